@@ -1,0 +1,10 @@
+# SSOCLIENT_SANITIZER applies to every target: a sanitizer sees only what is built with it.
+set(SSOCLIENT_SANITIZER "" CACHE STRING "Sanitizers to build with: address,undefined or thread")
+
+if(SSOCLIENT_SANITIZER)
+  add_compile_options(-fsanitize=${SSOCLIENT_SANITIZER} -fno-omit-frame-pointer -O1 -g1)
+  add_link_options(-fsanitize=${SSOCLIENT_SANITIZER})
+  if(SSOCLIENT_SANITIZER MATCHES "undefined")
+    add_compile_options(-fno-sanitize-recover=undefined)
+  endif()
+endif()
