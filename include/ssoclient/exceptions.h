@@ -1,0 +1,107 @@
+#ifndef SSOCLIENT_EXCEPTIONS_H
+#define SSOCLIENT_EXCEPTIONS_H
+
+#include <memory>
+#include <string>
+#include <utility>
+
+#include <ssoclient/export.h>
+#include <tarnik/core/exception.h>
+
+namespace SsoClient {
+
+/// Base of all of the library's own failures.
+class SSOCLIENT_EXPORT SsoException : public Tarnik::Exception {
+ public:
+  explicit SsoException(std::string message,
+                        const boost::source_location& where = Tarnik::CurrentLocation())
+      : Exception(std::move(message), where) {}
+  ~SsoException() override = default;
+  std::unique_ptr<Tarnik::Throwable> Clone() const override {
+    return std::make_unique<SsoException>(*this);
+  }
+  [[noreturn]] void Throw() const override { throw SsoException(*this); }
+};
+
+/// The transport or the HTTP exchange with the service failed: connection, TLS, time-out, or an
+/// HTTP status that is no answer.
+class SSOCLIENT_EXPORT CommunicationException : public SsoException {
+ public:
+  explicit CommunicationException(std::string message,
+                                  const boost::source_location& where = Tarnik::CurrentLocation())
+      : SsoException(std::move(message), where) {}
+  ~CommunicationException() override = default;
+  std::unique_ptr<Tarnik::Throwable> Clone() const override {
+    return std::make_unique<CommunicationException>(*this);
+  }
+  [[noreturn]] void Throw() const override { throw CommunicationException(*this); }
+};
+
+/// The service rejected the credentials.
+class SSOCLIENT_EXPORT InvalidCredentialsException : public SsoException {
+ public:
+  explicit InvalidCredentialsException(
+      std::string message, const boost::source_location& where = Tarnik::CurrentLocation())
+      : SsoException(std::move(message), where) {}
+  ~InvalidCredentialsException() override = default;
+  std::unique_ptr<Tarnik::Throwable> Clone() const override {
+    return std::make_unique<InvalidCredentialsException>(*this);
+  }
+  [[noreturn]] void Throw() const override { throw InvalidCredentialsException(*this); }
+};
+
+/// The user's password has expired.
+class SSOCLIENT_EXPORT PasswordExpiredException : public SsoException {
+ public:
+  explicit PasswordExpiredException(std::string message,
+                                    const boost::source_location& where = Tarnik::CurrentLocation())
+      : SsoException(std::move(message), where) {}
+  ~PasswordExpiredException() override = default;
+  std::unique_ptr<Tarnik::Throwable> Clone() const override {
+    return std::make_unique<PasswordExpiredException>(*this);
+  }
+  [[noreturn]] void Throw() const override { throw PasswordExpiredException(*this); }
+};
+
+/// Base of every failure to accept a token; raised only through its two subclasses.
+class SSOCLIENT_EXPORT InvalidTokenException : public SsoException {
+ public:
+  explicit InvalidTokenException(std::string message,
+                                 const boost::source_location& where = Tarnik::CurrentLocation())
+      : SsoException(std::move(message), where) {}
+  ~InvalidTokenException() override = default;
+  std::unique_ptr<Tarnik::Throwable> Clone() const override {
+    return std::make_unique<InvalidTokenException>(*this);
+  }
+  [[noreturn]] void Throw() const override { throw InvalidTokenException(*this); }
+};
+
+/// The token's XML breaks the accepted structure, or a validity rule fails.
+class SSOCLIENT_EXPORT ParseException : public InvalidTokenException {
+ public:
+  explicit ParseException(std::string message,
+                          const boost::source_location& where = Tarnik::CurrentLocation())
+      : InvalidTokenException(std::move(message), where) {}
+  ~ParseException() override = default;
+  std::unique_ptr<Tarnik::Throwable> Clone() const override {
+    return std::make_unique<ParseException>(*this);
+  }
+  [[noreturn]] void Throw() const override { throw ParseException(*this); }
+};
+
+/// The token's signature does not verify.
+class SSOCLIENT_EXPORT InvalidSignatureException : public InvalidTokenException {
+ public:
+  explicit InvalidSignatureException(
+      std::string message, const boost::source_location& where = Tarnik::CurrentLocation())
+      : InvalidTokenException(std::move(message), where) {}
+  ~InvalidSignatureException() override = default;
+  std::unique_ptr<Tarnik::Throwable> Clone() const override {
+    return std::make_unique<InvalidSignatureException>(*this);
+  }
+  [[noreturn]] void Throw() const override { throw InvalidSignatureException(*this); }
+};
+
+}  // namespace SsoClient
+
+#endif

@@ -1,0 +1,46 @@
+#ifndef SSOCLIENT_SECURITY_TOKEN_SERVICE_CONFIG_H
+#define SSOCLIENT_SECURITY_TOKEN_SERVICE_CONFIG_H
+
+#include <memory>
+#include <string>
+
+#include <ssoclient/saml_token_factory.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/http_user_agent.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/xml/security/key_info_resolver.h>
+
+namespace SsoClient {
+
+/// What a service needs to know. Read once, when the service is created; the service keeps its own
+/// references to the objects that it uses.
+struct SecurityTokenServiceConfig {
+  /// The service's URL, http or https.
+  std::string url;
+  /// The source of the keys that verify tokens outside of `tokenFactory`. A service does not read
+  /// it: what it verifies, it verifies through `tokenFactory`.
+  const Tarnik::Xml::Security::KeyInfoResolver* keyInfoResolver = nullptr;
+  /// Turns answered assertions into verified tokens.
+  std::shared_ptr<SamlTokenFactory> tokenFactory;
+  /// The name that the service's TLS certificate must carry; the URL's host if empty.
+  std::string sslPeerName;
+  /// Whom to trust with TLS; may be null for a plain http URL.
+  Tarnik::Ssl::SSLContext* sslContext = nullptr;
+  /// Look for a replacement host before each connection. No source of replacements is built in, so
+  /// connections go to the URL's host either way.
+  bool flag = false;
+};
+
+/// The same for callers that bring their own HTTP user agent.
+struct SecurityTokenServiceConfigEx {
+  /// The request target of every POST, used as it stands.
+  std::string url;
+  /// Shared by all exchanges of the service; knows where and how to connect.
+  Tarnik::Ref<Tarnik::Http::UserAgent> userAgent;
+  /// Turns answered assertions into verified tokens.
+  std::shared_ptr<SamlTokenFactory> tokenFactory;
+};
+
+}  // namespace SsoClient
+
+#endif

@@ -1,0 +1,103 @@
+#ifndef TARNIK_CORE_EXCEPTION_H
+#define TARNIK_CORE_EXCEPTION_H
+
+#include <memory>
+#include <string>
+#include <utility>
+
+#include <tarnik/core/throwable.h>
+
+namespace Tarnik {
+
+/// Base of all failures that a caller may handle. Carries one message.
+class TARNIK_EXPORT Exception : public Throwable {
+ public:
+  explicit Exception(std::string message, const boost::source_location& where = CurrentLocation());
+  ~Exception() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// An argument that the called function cannot accept.
+class TARNIK_EXPORT InvalidArgumentException : public Exception {
+ public:
+  explicit InvalidArgumentException(std::string message,
+                                    const boost::source_location& where = CurrentLocation());
+  ~InvalidArgumentException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// An object that is not in the state which the called function needs.
+class TARNIK_EXPORT InvalidStateException : public Exception {
+ public:
+  explicit InvalidStateException(std::string message,
+                                 const boost::source_location& where = CurrentLocation());
+  ~InvalidStateException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// An object that is not of the class that it was taken for.
+class TARNIK_EXPORT TypeMismatchException : public Exception {
+ public:
+  explicit TypeMismatchException(std::string message,
+                                 const boost::source_location& where = CurrentLocation());
+  ~TypeMismatchException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// A text that is not a date and time.
+class TARNIK_EXPORT DateTimeFormatException : public Exception {
+ public:
+  explicit DateTimeFormatException(std::string message,
+                                   const boost::source_location& where = CurrentLocation());
+  ~DateTimeFormatException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// A text that is not Base64.
+class TARNIK_EXPORT Base64FormatException : public Exception {
+ public:
+  explicit Base64FormatException(std::string message,
+                                 const boost::source_location& where = CurrentLocation());
+  ~Base64FormatException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// An input or output operation that failed: file, socket or stream.
+class TARNIK_EXPORT IOException : public Exception {
+ public:
+  explicit IOException(std::string message,
+                       const boost::source_location& where = CurrentLocation());
+  ~IOException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// An operation that did not end within its time limit.
+class TARNIK_EXPORT TimeoutException : public IOException {
+ public:
+  explicit TimeoutException(std::string message,
+                            const boost::source_location& where = CurrentLocation());
+  ~TimeoutException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// An operation that was cancelled before it ended.
+class TARNIK_EXPORT CancelledException : public IOException {
+ public:
+  explicit CancelledException(std::string message,
+                              const boost::source_location& where = CurrentLocation());
+  ~CancelledException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+}  // namespace Tarnik
+
+#endif

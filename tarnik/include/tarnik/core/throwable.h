@@ -1,0 +1,52 @@
+#ifndef TARNIK_CORE_THROWABLE_H
+#define TARNIK_CORE_THROWABLE_H
+
+#include <boost/assert/source_location.hpp>
+#include <exception>
+#include <memory>
+#include <string>
+
+#include <tarnik/export.h>
+
+namespace Tarnik {
+
+/// The place in the source where this function is used as a default argument.
+constexpr boost::source_location CurrentLocation(const char* file = __builtin_FILE(),
+                                                 boost::uint_least32_t line = __builtin_LINE(),
+                                                 const char* function = __builtin_FUNCTION()) {
+  return boost::source_location(file, line, function);
+}
+
+/// Root of everything that the platform throws. The order of the virtual functions is part of the
+/// binary interface: destructors, `what`, `Message`, `Dump`, `Where`, `Clone`, `Throw`.
+class TARNIK_EXPORT Throwable : public std::exception {
+ public:
+  Throwable(const Throwable&) = default;
+  Throwable& operator=(const Throwable&) = default;
+  ~Throwable() override;
+
+  /// The message as a C string; lives as long as this object.
+  const char* what() const noexcept override;
+  /// The message.
+  virtual const std::string& Message() const noexcept;
+  /// Class, message and place in one line, for logs: "Class: message (file:line, function)".
+  virtual std::string Dump() const;
+  /// The place in the source where the exception was made.
+  virtual boost::source_location Where() const noexcept;
+  /// A copy on the heap with this object's exact class.
+  virtual std::unique_ptr<Throwable> Clone() const = 0;
+  /// Throws a copy of this object as its exact class.
+  [[noreturn]] virtual void Throw() const = 0;
+
+ protected:
+  Throwable(std::string message, const boost::source_location& where);
+
+ private:
+  // Shared, so that copying an exception allocates nothing and cannot fail.
+  std::shared_ptr<const std::string> message_;
+  boost::source_location where_;
+};
+
+}  // namespace Tarnik
+
+#endif

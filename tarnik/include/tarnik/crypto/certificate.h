@@ -1,0 +1,45 @@
+#ifndef TARNIK_CRYPTO_CERTIFICATE_H
+#define TARNIK_CRYPTO_CERTIFICATE_H
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/public_key.h>
+#include <tarnik/system/date_time.h>
+
+namespace Tarnik::Crypto {
+
+/// An X.509 certificate (RFC 5280). Immutable; safe from many threads.
+class TARNIK_EXPORT Certificate : public virtual Object {
+ public:
+  /// The DER encoding and its length in bytes; valid as long as the certificate.
+  virtual const unsigned char* DerBytes() const noexcept = 0;
+  virtual std::size_t DerLength() const noexcept = 0;
+  /// Distinguished names in the form of RFC 2253 (most specific part first).
+  virtual const std::string& SubjectName() const = 0;
+  virtual const std::string& IssuerName() const = 0;
+  /// Decimal.
+  virtual const std::string& SerialNumber() const = 0;
+  virtual System::DateTime NotBefore() const = 0;
+  virtual System::DateTime NotAfter() const = 0;
+  /// The SubjectKeyIdentifier extension; empty when there is none.
+  virtual const std::vector<unsigned char>& SubjectKeyIdentifier() const = 0;
+  virtual Ref<const PublicKey> GetPublicKey() const = 0;
+};
+
+/// Decodes one certificate. A certificate that was decoded before is found again by its bytes.
+/// Throws `CryptoException` when the bytes are not exactly one certificate.
+TARNIK_EXPORT Ref<const Certificate> CreateCertificateFromDer(const unsigned char* bytes,
+                                                              std::size_t length);
+/// Reads every CERTIFICATE block of a PEM text (RFC 7468), in order. Throws `CryptoException` when
+/// there is none or one is broken.
+TARNIK_EXPORT std::vector<Ref<const Certificate>> CreateCertificatesFromPem(std::string_view pem);
+/// Reads a file of PEM certificates. Throws `IOException` when it cannot be read, else as above.
+TARNIK_EXPORT std::vector<Ref<const Certificate>> LoadCertificates(const std::string& path);
+
+}  // namespace Tarnik::Crypto
+
+#endif

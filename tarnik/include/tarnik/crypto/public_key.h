@@ -1,0 +1,21 @@
+#ifndef TARNIK_CRYPTO_PUBLIC_KEY_H
+#define TARNIK_CRYPTO_PUBLIC_KEY_H
+
+#include <tarnik/core/object.h>
+#include <tarnik/core/ref.h>
+
+namespace Tarnik::Crypto {
+
+enum class KeyAlgorithm { kRsa, kRsaPss, kEc, kOther };
+
+/// A public key. Immutable; safe from many threads. Made by `Certificate::GetPublicKey`.
+class TARNIK_EXPORT PublicKey : public virtual Object {
+ public:
+  virtual KeyAlgorithm Algorithm() const noexcept = 0;
+  /// Size in bits: of the modulus for RSA, of the order for EC.
+  virtual int Bits() const noexcept = 0;
+};
+
+}  // namespace Tarnik::Crypto
+
+#endif

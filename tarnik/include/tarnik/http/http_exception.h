@@ -1,0 +1,23 @@
+#ifndef TARNIK_HTTP_HTTP_EXCEPTION_H
+#define TARNIK_HTTP_HTTP_EXCEPTION_H
+
+#include <memory>
+#include <string>
+
+#include <tarnik/core/exception.h>
+
+namespace Tarnik::Http {
+
+/// An HTTP exchange that broke the protocol or a limit.
+class TARNIK_EXPORT HttpException : public IOException {
+ public:
+  explicit HttpException(std::string message,
+                         const boost::source_location& where = CurrentLocation());
+  ~HttpException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+}  // namespace Tarnik::Http
+
+#endif

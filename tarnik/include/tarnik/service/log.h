@@ -1,0 +1,65 @@
+#ifndef TARNIK_SERVICE_LOG_H
+#define TARNIK_SERVICE_LOG_H
+
+#include <functional>
+#include <initializer_list>
+#include <string>
+#include <string_view>
+
+#include <tarnik/export.h>
+#include <tarnik/text/print.h>
+
+namespace Tarnik::Service {
+
+/// A named logger, made once and never destroyed before the process ends. A line of level L is
+/// written when the logger's level is at least L. Levels run from 0 (silence) to 9 (everything);
+/// a new logger has level 4: 1 fatal, 2 error, 3 failure of one request, 4 warning, 5 notice,
+/// 6 information, 7 trace of operations, 8 and 9 detail.
+///
+/// Loggers of one name share one level. Safe from any thread.
+class TARNIK_EXPORT StaticLogger {
+ public:
+  /// `name` must live as long as the process (a literal).
+  explicit StaticLogger(const char* name);
+
+  const char* Name() const noexcept { return name_; }
+  int Level() const noexcept;
+  bool IsEnabled(int level) const noexcept { return Level() >= level; }
+
+ private:
+  struct Entry;
+  friend TARNIK_EXPORT void SetLogLevel(std::string_view name, int level);
+  friend class LogRegistry;
+
+  const char* name_;
+  Entry* entry_;
+};
+
+/// Writes one line at `level` (1 to 9): `format` with "%1" to "%N" replaced, as
+/// `Detail::ASPrintInternal` does. Control characters in the line are escaped, so that one call is
+/// one line. Does nothing when the logger's level is lower. Never throws.
+TARNIK_EXPORT void LogInternal(const StaticLogger& logger, int level, std::string_view format,
+                               std::initializer_list<PrintFormatter> arguments) noexcept;
+
+/// Sets the level of the logger `name`, also when it is made only later. Throws
+/// `InvalidArgumentException` unless `level` is 0 to 9.
+TARNIK_EXPORT void SetLogLevel(std::string_view name, int level);
+
+/// One line on its way to the sink. The views are valid only during the call.
+struct LogRecord {
+  std::string_view logger;
+  int level;
+  std::string_view text;
+};
+
+/// Receives every line that passes its logger's level; called on the thread that logs, possibly
+/// from several at once.
+using LogSink = std::function<void(const LogRecord&)>;
+
+/// Sends all lines to `sink` from now on; an empty one brings back the default, which writes time,
+/// level, logger and text to the standard error stream.
+TARNIK_EXPORT void SetLogSink(LogSink sink);
+
+}  // namespace Tarnik::Service
+
+#endif

@@ -1,0 +1,89 @@
+#ifndef TARNIK_SYSTEM_DATE_TIME_H
+#define TARNIK_SYSTEM_DATE_TIME_H
+
+#include <string>
+#include <string_view>
+
+#include <tarnik/export.h>
+
+namespace Tarnik::System {
+
+/// An instant on the UTC time line in microseconds since 1970-01-01T00:00:00Z, with the offset of
+/// the zone in which its calendar fields are told. Immutable value; comparisons look at the instant
+/// alone.
+///
+/// The range is 0001-01-01T00:00:00.000000Z to 9999-12-31T23:59:59.999999Z, the years that XML
+/// Schema dateTime writes in four digits; instants beyond it are moved to its nearest end.
+class TARNIK_EXPORT DateTime {
+ public:
+  /// 1970-01-01T00:00:00Z.
+  DateTime() = default;
+
+  /// Reads the XML Schema dateTime form (XML Schema Part 2, section 3.2.7):
+  /// "YYYY-MM-DDThh:mm:ss[.fraction][Z|(+|-)hh:mm]".
+  ///
+  /// A time without a zone is UTC (SAML 2.0 core, section 1.3.3). Digits of the fraction beyond the
+  /// sixth are cut off. 24:00:00 is midnight of the next day. Refused with
+  /// `DateTimeFormatException`: years before 0001 or after 9999, leap seconds, zones beyond 14:00,
+  /// lower-case letters, white space, and anything else that the form does not hold.
+  static DateTime Parse(std::string_view text);
+
+  /// Microseconds since 1970-01-01T00:00:00Z.
+  long GetUtcTime() const noexcept { return utcMicroseconds_; }
+  /// Minutes that the zone of the calendar fields is ahead of UTC, -840 to 840.
+  int Bias() const noexcept { return biasMinutes_; }
+
+  /// Calendar fields (proleptic Gregorian) in this value's zone.
+  struct Fields {
+    int century;        ///< 0 to 99: the year divided by 100
+    int yearOfCentury;  ///< 0 to 99
+    int month;          ///< 1 to 12
+    int day;            ///< 1 to 31
+    int hour;           ///< 0 to 23
+    int minute;         ///< 0 to 59
+    int second;         ///< 0 to 59
+    int millisecond;    ///< 0 to 999
+    int microsecond;    ///< 0 to 999, within the millisecond
+  };
+  Fields GetFields() const noexcept;
+
+  /// "2024-03-05T07:08:09.010Z"; microseconds are added when they are not zero
+  /// ("2024-03-05T07:08:09.010007Z").
+  std::string ToString() const;
+
+  /// The zone designator: "Z" for UTC, else "+hh:mm" or "-hh:mm".
+  std::string ToShortStringBias() const;
+
+  friend bool operator==(const DateTime& a, const DateTime& b) noexcept {
+    return a.utcMicroseconds_ == b.utcMicroseconds_;
+  }
+  friend bool operator!=(const DateTime& a, const DateTime& b) noexcept { return !(a == b); }
+  friend bool operator<(const DateTime& a, const DateTime& b) noexcept {
+    return a.utcMicroseconds_ < b.utcMicroseconds_;
+  }
+  friend bool operator>(const DateTime& a, const DateTime& b) noexcept { return b < a; }
+  friend bool operator<=(const DateTime& a, const DateTime& b) noexcept { return !(b < a); }
+  friend bool operator>=(const DateTime& a, const DateTime& b) noexcept { return !(a < b); }
+
+ private:
+  friend TARNIK_EXPORT DateTime DateTimeFromUtc(long utcMicroseconds, bool inLocalZone);
+  DateTime(long utcMicroseconds, int biasMinutes) noexcept;
+
+  long utcMicroseconds_ = 0;
+  int biasMinutes_ = 0;
+};
+
+/// The instant `utcMicroseconds` after 1970-01-01T00:00:00Z, its fields told in UTC, or in the
+/// process's local zone if `inLocalZone`.
+TARNIK_EXPORT DateTime DateTimeFromUtc(long utcMicroseconds, bool inLocalZone);
+
+/// The system clock's time now, told in UTC.
+TARNIK_EXPORT DateTime GetUtcDateTime();
+
+/// `a + b` and `a * b` that stop at the ends of the 64-bit range instead of overflowing.
+TARNIK_EXPORT long SaturatingAdd(long a, long b) noexcept;
+TARNIK_EXPORT long SaturatingMultiply(long a, long b) noexcept;
+
+}  // namespace Tarnik::System
+
+#endif

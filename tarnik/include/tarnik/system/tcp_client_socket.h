@@ -1,0 +1,31 @@
+#ifndef TARNIK_SYSTEM_TCP_CLIENT_SOCKET_H
+#define TARNIK_SYSTEM_TCP_CLIENT_SOCKET_H
+
+#include <functional>
+#include <string>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/system/stream.h>
+#include <tarnik/system/thread_pool.h>
+
+namespace Tarnik::System {
+
+/// A TCP connection that this side opens.
+class TARNIK_EXPORT TCPClientSocket : public Stream {
+ public:
+  using ConnectCompletion = std::function<void(TCPClientSocket*, Exception*)>;
+
+  /// Resolves `host` (a name or a literal IPv4 or IPv6 address, without brackets) and connects to
+  /// `port`, trying each of its addresses in turn. The completion gets this socket and null, or
+  /// this socket and an `IOException` that names host, port and the last cause. Called once per
+  /// socket.
+  virtual void ConnectAsync(const std::string& host, int port, ConnectCompletion completion) = 0;
+};
+
+/// A new, unconnected socket whose completions run on the I/O threads of `pool`.
+TARNIK_EXPORT Ref<TCPClientSocket> CreateTCPClientSocket(ThreadPool* pool);
+
+}  // namespace Tarnik::System
+
+#endif

@@ -1,0 +1,57 @@
+#ifndef TARNIK_TEXT_PRINT_H
+#define TARNIK_TEXT_PRINT_H
+
+#include <initializer_list>
+#include <string>
+#include <string_view>
+#include <type_traits>
+#include <utility>
+
+#include <tarnik/export.h>
+#include <tarnik/system/date_time.h>
+
+namespace Tarnik {
+
+/// One argument of a format: any value, turned into text when the formatter is made.
+///
+/// Booleans print as "true" and "false", integers in decimal, pointers in hexadecimal behind "0x",
+/// date-times in their `DateTime::ToString` form, texts as they are.
+class TARNIK_EXPORT PrintFormatter {
+ public:
+  PrintFormatter(std::string text) : text_(std::move(text)) {}
+  PrintFormatter(std::string_view text) : text_(text) {}
+  PrintFormatter(const char* text) : text_(text) {}
+  PrintFormatter(const System::DateTime& time) : text_(time.ToString()) {}
+  PrintFormatter(const void* pointer);
+  template <class Integer, std::enable_if_t<std::is_integral_v<Integer>, int> = 0>
+  PrintFormatter(Integer value) {
+    if constexpr (std::is_same_v<Integer, bool>) {
+      text_ = value ? "true" : "false";
+    } else {
+      text_ = std::to_string(value);
+    }
+  }
+
+  const std::string& Text() const noexcept { return text_; }
+
+ private:
+  std::string text_;
+};
+
+/// A date-time in the form for people: "2024-03-05 07:08:09.010 UTC", milliseconds always shown.
+class TARNIK_EXPORT DatePrintFormatter : public PrintFormatter {
+ public:
+  explicit DatePrintFormatter(const System::DateTime& time);
+};
+
+namespace Detail {
+
+/// `format` with each "%N" (N from 1) replaced by argument N. Arguments are not scanned again; a
+/// percent sign without the number of an argument behind it stays as it is.
+TARNIK_EXPORT std::string ASPrintInternal(std::string_view format,
+                                          std::initializer_list<PrintFormatter> arguments);
+
+}  // namespace Detail
+}  // namespace Tarnik
+
+#endif

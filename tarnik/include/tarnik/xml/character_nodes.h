@@ -1,0 +1,57 @@
+#ifndef TARNIK_XML_CHARACTER_NODES_H
+#define TARNIK_XML_CHARACTER_NODES_H
+
+#include <string_view>
+
+#include <tarnik/xml/node.h>
+
+namespace Tarnik::Xml {
+
+/// Character data. Adjacent pieces and CDATA sections of a parsed document form one text node.
+class TARNIK_EXPORT TextNode final : public Node {
+ public:
+  std::string_view Text() const noexcept { return {text_, length_}; }
+  /// Sets the text. Throws `InvalidArgumentException` for what XML 1.0 cannot carry (section 2.2).
+  void SetText(std::string_view text);
+
+ private:
+  friend class Tree;
+  friend class TreeBuilder;
+  using Node::Node;
+  const char* text_ = "";
+  std::size_t length_ = 0;
+};
+
+class TARNIK_EXPORT CommentNode final : public Node {
+ public:
+  std::string_view Text() const noexcept { return {text_, length_}; }
+
+ private:
+  friend class Tree;
+  friend class TreeBuilder;
+  using Node::Node;
+  const char* text_ = "";
+  std::size_t length_ = 0;
+};
+
+class TARNIK_EXPORT ProcessingInstructionNode final : public Node {
+ public:
+  std::string_view Target() const noexcept { return {target_, targetLength_}; }
+  std::string_view Text() const noexcept { return {text_, length_}; }
+
+ private:
+  friend class Tree;
+  friend class TreeBuilder;
+  using Node::Node;
+  const char* target_ = "";
+  const char* text_ = "";
+  std::size_t targetLength_ = 0;
+  std::size_t length_ = 0;
+};
+
+/// Makes an empty text node.
+TARNIK_EXPORT void CreateTextNode(Ref<TextNode>& text);
+
+}  // namespace Tarnik::Xml
+
+#endif

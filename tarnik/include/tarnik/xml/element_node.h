@@ -1,0 +1,102 @@
+#ifndef TARNIK_XML_ELEMENT_NODE_H
+#define TARNIK_XML_ELEMENT_NODE_H
+
+#include <cstddef>
+#include <optional>
+#include <string_view>
+
+#include <tarnik/xml/node.h>
+
+namespace Tarnik::Xml {
+
+struct InternedName;
+
+/// A qualified name: "prefix:local", or "local" with an empty prefix.
+class QualifiedName {
+ public:
+  QualifiedName() = default;
+  QualifiedName(std::string_view full, std::size_t prefixLength) noexcept
+      : full_(full), prefixLength_(prefixLength) {}
+
+  std::string_view Full() const noexcept { return full_; }
+  std::string_view Prefix() const noexcept { return full_.substr(0, prefixLength_); }
+  std::string_view Local() const noexcept {
+    return prefixLength_ == 0 ? full_ : full_.substr(prefixLength_ + 1);
+  }
+
+ private:
+  std::string_view full_;
+  std::size_t prefixLength_ = 0;
+};
+
+/// An attribute, namespace declarations included: these are attributes named "xmlns" or "xmlns:p".
+class TARNIK_EXPORT Attribute {
+ public:
+  std::string_view Name() const noexcept { return Qualified().Full(); }
+  QualifiedName Qualified() const noexcept;
+  std::string_view Value() const noexcept { return {value_, valueLength_}; }
+  /// True for "xmlns" and "xmlns:p".
+  bool IsNamespaceDeclaration() const noexcept;
+
+ private:
+  friend class ElementNode;
+  friend class TreeBuilder;
+  const InternedName* name_;
+  const char* value_;
+  unsigned valueLength_;
+};
+
+/// An element. Its attributes keep the order in which they were written or set; namespace
+/// declarations are ordinary attributes among them.
+class TARNIK_EXPORT ElementNode final : public ParentNode {
+ public:
+  /// The name as written, with its prefix.
+  std::string_view QualifiedNameText() const noexcept;
+  std::string_view Prefix() const noexcept;
+  std::string_view LocalName() const noexcept;
+  /// The namespace bound to the element's prefix here; empty when there is none.
+  std::string_view NamespaceUri() const noexcept;
+
+  /// The namespace bound to `prefix` in scope at this element (Namespaces in XML 1.0, section 6);
+  /// the empty prefix asks for the default namespace. None when nothing binds it; an empty text
+  /// when the default namespace is undeclared with xmlns="". "xml" is always bound.
+  std::optional<std::string_view> LookupNamespace(std::string_view prefix) const noexcept;
+
+  std::size_t AttributeCount() const noexcept;
+  /// Attribute `index`, from 0.
+  const Attribute& AttributeAt(std::size_t index) const noexcept;
+  /// The value of the attribute with this qualified name, or none.
+  std::optional<std::string_view> FindAttribute(std::string_view qualifiedName) const noexcept;
+  /// The value of the attribute with this expanded name, or none; the empty namespace finds
+  /// attributes without a prefix.
+  std::optional<std::string_view> FindAttribute(std::string_view namespaceUri,
+                                                std::string_view localName) const noexcept;
+
+  /// Sets an attribute by its qualified name: a new one is added last, an existing one keeps its
+  /// place. Throws `InvalidArgumentException` when the name is not a qualified name or the value
+  /// holds what XML 1.0 cannot carry (section 2.2: control characters, broken UTF-8, U+FFFE,
+  /// U+FFFF).
+  void SetAttribute(std::string_view qualifiedName, std::string_view value);
+  /// Removes the attribute; false when there was none.
+  bool RemoveAttribute(std::string_view qualifiedName) noexcept;
+
+ private:
+  friend class Tree;
+  friend class TreeBuilder;
+  using ParentNode::ParentNode;
+
+  const InternedName* name_ = nullptr;
+  Attribute* attributes_ = nullptr;
+  unsigned attributeCount_ = 0;
+  unsigned attributeCapacity_ = 0;
+};
+
+/// Makes an element without attributes or children. An empty prefix gives an unprefixed name.
+/// Throws `InvalidArgumentException` unless prefix and local name are NCNames (Namespaces in
+/// XML 1.0, section 3).
+TARNIK_EXPORT void CreateElementNode(std::string_view prefix, std::string_view localName,
+                                     Ref<ElementNode>& element);
+
+}  // namespace Tarnik::Xml
+
+#endif

@@ -1,0 +1,97 @@
+#ifndef TARNIK_XML_NODE_H
+#define TARNIK_XML_NODE_H
+
+#include <string>
+#include <string_view>
+
+#include <tarnik/core/object.h>
+#include <tarnik/core/ref.h>
+
+namespace Tarnik::Xml {
+
+class ElementNode;
+class ParentNode;
+class Tree;
+
+enum class NodeKind : unsigned char {
+  kElement,
+  kText,
+  kComment,
+  kProcessingInstruction,
+  kDocument
+};
+
+/// A node of the document tree.
+///
+/// A reference to any node keeps its whole tree alive, and appending a node joins its tree with the
+/// new parent's; so parents, children and the texts that accessors return as views are valid as
+/// long as anything of the tree is referenced (and, for a value that is set anew, until it is set).
+/// A tree that nobody changes may be read from many threads at once.
+class TARNIK_EXPORT Node : public Object {
+ public:
+  void IncRef() const noexcept final;
+  void DecRef() const noexcept final;
+  long RefCount() const noexcept final;
+  /// The kind and, for elements, the name; never content.
+  std::string ToString() const override;
+
+  NodeKind Kind() const noexcept { return kind_; }
+  /// The element or document that holds this node, or null.
+  ParentNode* Parent() const noexcept { return parent_; }
+  /// The element that holds this node, or null (also for the root element of a document).
+  ElementNode* ParentElement() const noexcept;
+  /// The next child of the same parent, or null.
+  Node* NextSibling() const noexcept;
+  /// Place in the source document, counted from 1; 0 for nodes that were not parsed.
+  int Line() const noexcept { return line_; }
+  int Column() const noexcept { return column_; }
+
+ protected:
+  Node(Tree& tree, NodeKind kind) noexcept : tree_(&tree), kind_(kind) {}
+  ~Node() override = default;
+
+ private:
+  friend class ParentNode;
+  friend class ElementNode;
+  friend class Tree;
+  friend class TreeBuilder;
+
+  Tree* tree_;
+  ParentNode* parent_ = nullptr;
+  Node* next_ = nullptr;  // the last child points at the first
+  unsigned line_ = 0;
+  unsigned column_ : 24;
+  NodeKind kind_;
+};
+
+/// A node that has children: an element or a document.
+class TARNIK_EXPORT ParentNode : public Node {
+ public:
+  /// The first and last child, or null.
+  Node* FirstChild() const noexcept;
+  Node* LastChild() const noexcept { return last_; }
+  /// The first child element with this local name, whatever its namespace, or null.
+  ElementNode* FirstChildElement(std::string_view localName) const noexcept;
+  /// The first child element with this expanded name, or null.
+  ElementNode* FirstChildElement(std::string_view namespaceUri,
+                                 std::string_view localName) const noexcept;
+
+  /// Makes `child` the last child, taking it from the parent that it had. Throws
+  /// `InvalidArgumentException` when `child` is null, a document, or this node or one that holds
+  /// it.
+  void AppendChild(Node* child);
+  /// Takes `child` out; it goes on living in this tree without a parent. Throws
+  /// `InvalidArgumentException` when it is not a child of this node.
+  void RemoveChild(Node* child);
+
+ protected:
+  using Node::Node;
+
+ private:
+  friend class TreeBuilder;
+  Node* last_ = nullptr;
+};
+
+}  // namespace Tarnik::Xml
+
+#endif

@@ -1,0 +1,31 @@
+#ifndef TARNIK_XML_SECURITY_KEY_INFO_H
+#define TARNIK_XML_SECURITY_KEY_INFO_H
+
+#include <string>
+#include <vector>
+
+#include <tarnik/core/ref.h>
+#include <tarnik/xml/element_node.h>
+
+namespace Tarnik::Xml::Security {
+
+/// What a message says of the key that signed it (XML-Signature, section 4.4). These are hints for
+/// a `KeyInfoResolver`; nothing here is to be trusted.
+struct KeyInfo {
+  struct IssuerSerial {
+    std::string issuerName;    ///< distinguished name, as written
+    std::string serialNumber;  ///< decimal, as written
+  };
+
+  std::vector<std::vector<unsigned char>> certificates;  ///< DER, in document order
+  std::vector<IssuerSerial> issuerSerials;
+  std::vector<std::string> subjectNames;
+  std::vector<std::vector<unsigned char>> subjectKeyIdentifiers;
+  std::vector<std::string> keyNames;
+  /// The KeyInfo element itself, or null when the signature has none.
+  Ref<const ElementNode> element;
+};
+
+}  // namespace Tarnik::Xml::Security
+
+#endif

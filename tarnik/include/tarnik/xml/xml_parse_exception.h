@@ -1,0 +1,30 @@
+#ifndef TARNIK_XML_XML_PARSE_EXCEPTION_H
+#define TARNIK_XML_XML_PARSE_EXCEPTION_H
+
+#include <memory>
+#include <string>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/xml/xml_parser.h>
+
+namespace Tarnik::Xml {
+
+/// A document that was refused. The message ends in " at line L, column C".
+class TARNIK_EXPORT XMLParseException : public Exception {
+ public:
+  XMLParseException(const std::string& fault, const Position& position,
+                    const boost::source_location& where = CurrentLocation());
+  ~XMLParseException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+
+  unsigned long Line() const noexcept { return position_.line; }
+  unsigned long Column() const noexcept { return position_.column; }
+
+ private:
+  Position position_;
+};
+
+}  // namespace Tarnik::Xml
+
+#endif
