@@ -1,0 +1,101 @@
+#include <tarnik/service/log.h>
+
+#include <gtest/gtest.h>
+
+#include <mutex>
+#include <stdexcept>
+#include <thread>
+#include <vector>
+
+#include <tarnik/core/exception.h>
+
+namespace Tarnik::Service {
+namespace {
+
+struct Line {
+  std::string logger;
+  int level;
+  std::string text;
+};
+
+class LogTest : public ::testing::Test {
+ protected:
+  LogTest() {
+    SetLogSink([this](const LogRecord& record) {
+      const std::lock_guard guard(mutex_);
+      lines_.push_back({std::string(record.logger), record.level, std::string(record.text)});
+    });
+  }
+  ~LogTest() override { SetLogSink({}); }
+
+  std::mutex mutex_;
+  std::vector<Line> lines_;
+};
+
+TEST_F(LogTest, NewLoggerWritesWarningsAndWorse) {
+  const StaticLogger logger("LogTest.New");
+  EXPECT_EQ(logger.Level(), 4);
+  LogInternal(logger, 4, "warning %1", {1});
+  LogInternal(logger, 5, "notice", {});
+  ASSERT_EQ(lines_.size(), 1U);
+  EXPECT_EQ(lines_[0].logger, "LogTest.New");
+  EXPECT_EQ(lines_[0].level, 4);
+  EXPECT_EQ(lines_[0].text, "warning 1");
+}
+
+TEST_F(LogTest, LevelIsSharedByNameAndMayBeSetBeforehand) {
+  SetLogLevel("LogTest.Shared", 7);
+  const StaticLogger first("LogTest.Shared");
+  const StaticLogger second("LogTest.Shared");
+  EXPECT_TRUE(first.IsEnabled(7));
+  EXPECT_FALSE(first.IsEnabled(8));
+  SetLogLevel("LogTest.Shared", 0);
+  EXPECT_FALSE(second.IsEnabled(1));
+}
+
+TEST_F(LogTest, RefusesLevelsOutsideTheScale) {
+  EXPECT_THROW(SetLogLevel("LogTest.Range", -1), InvalidArgumentException);
+  EXPECT_THROW(SetLogLevel("LogTest.Range", 10), InvalidArgumentException);
+}
+
+TEST_F(LogTest, OneCallIsOneLine) {
+  const StaticLogger logger("LogTest.Escape");
+  LogInternal(logger, 1, "%1", {"a\nforged line\r\x1b[31m\x7f\xC3\xA4"});
+  ASSERT_EQ(lines_.size(), 1U);
+  EXPECT_EQ(lines_[0].text, "a\\x0aforged line\\x0d\\x1b[31m\\x7f\xC3\xA4");
+}
+
+TEST_F(LogTest, SinkThatThrowsDoesNotDisturbTheCaller) {
+  SetLogSink([](const LogRecord&) { throw std::runtime_error("full"); });
+  const StaticLogger logger("LogTest.Throw");
+  LogInternal(logger, 1, "line", {});
+}
+
+TEST_F(LogTest, EmptySinkBringsBackStandardError) {
+  const StaticLogger logger("LogTest.Default");
+  SetLogSink({});
+  ::testing::internal::CaptureStderr();
+  LogInternal(logger, 2, "to %1", {"stderr"});
+  const std::string output = ::testing::internal::GetCapturedStderr();
+  EXPECT_NE(output.find(" 2 LogTest.Default: to stderr\n"), std::string::npos) << output;
+  EXPECT_TRUE(lines_.empty());
+}
+
+TEST_F(LogTest, ConcurrentLinesAllArrive) {
+  const StaticLogger logger("LogTest.Threads");
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 4; ++t) {
+    threads.emplace_back([&logger] {
+      for (int i = 0; i < 250; ++i) {
+        LogInternal(logger, 1, "line %1", {i});
+      }
+    });
+  }
+  for (auto& thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(lines_.size(), 1000U);
+}
+
+}  // namespace
+}  // namespace Tarnik::Service
