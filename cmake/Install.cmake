@@ -1,0 +1,27 @@
+# ssoclient_install_package(NAME ... TARGET ... HEADERS ... DESCRIPTION ... [REQUIRES ...]): installs a shared library
+# with its headers, a CMake package and a pkg-config file.
+function(ssoclient_install_package)
+  cmake_parse_arguments(PACKAGE "" "NAME;TARGET;HEADERS;DESCRIPTION;REQUIRES" "" ${ARGN})
+  set(cmake_dir "${CMAKE_INSTALL_LIBDIR}/cmake/${PACKAGE_NAME}")
+
+  install(TARGETS ${PACKAGE_TARGET} EXPORT ${PACKAGE_NAME}Targets
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+  install(DIRECTORY ${PACKAGE_HEADERS} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
+    FILES_MATCHING PATTERN "*.h")
+  install(EXPORT ${PACKAGE_NAME}Targets NAMESPACE ${PACKAGE_NAME}:: DESTINATION ${cmake_dir})
+
+  configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/${PACKAGE_NAME}Config.cmake.in"
+    "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}Config.cmake" INSTALL_DESTINATION ${cmake_dir})
+  write_basic_package_version_file(
+    "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"
+    VERSION ${PROJECT_VERSION} COMPATIBILITY SameMinorVersion)
+  install(FILES
+    "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}Config.cmake"
+    "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"
+    DESTINATION ${cmake_dir})
+
+  configure_file("${PROJECT_SOURCE_DIR}/cmake/package.pc.in"
+    "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc" @ONLY)
+  install(FILES "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc"
+    DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
+endfunction()
