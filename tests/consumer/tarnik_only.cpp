@@ -1,0 +1,15 @@
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/xml_parser.h>
+
+#include <iostream>
+
+int main() {
+  const auto reader = Tarnik::CreateStringReader("<a><b/></a>");
+  const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
+  const auto parsed = Tarnik::Xml::CreateXMLParser(reader.get(), handler.get())->Parse();
+  const auto* document = Tarnik::CheckedCast<Tarnik::Xml::Document>(parsed.get());
+  std::cout << document->RootElement()->LocalName() << '\n';
+  return document->RootElement()->FirstChildElement("b") == nullptr ? 1 : 0;
+}
