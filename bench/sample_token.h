@@ -1,0 +1,20 @@
+#ifndef BENCH_SAMPLE_TOKEN_H
+#define BENCH_SAMPLE_TOKEN_H
+
+#include <cstddef>
+#include <string>
+
+namespace Bench {
+
+/// A signed bearer token, valid now, and the certificate that verifies it.
+struct SampleToken {
+  std::string xml;
+  std::string certificatePem;
+};
+
+/// The token of about `size` bytes (at least 2,000), grown by groups. Made once per size.
+const SampleToken& GetSampleToken(std::size_t size);
+
+}  // namespace Bench
+
+#endif

@@ -1,0 +1,35 @@
+#include "token_memory.h"
+
+#include <malloc.h>
+#include <ssoclient/saml_token.h>
+
+#include <memory>
+#include <vector>
+
+#include "sample_token.h"
+
+namespace Bench {
+namespace {
+
+std::size_t HeapInUse() {
+  const struct mallinfo2 info = mallinfo2();
+  return info.uordblks + info.hblkhd;
+}
+
+}  // namespace
+
+double TokenMemory(std::size_t size) {
+  constexpr std::size_t kTokens = 64;
+  const std::string& xml = GetSampleToken(size).xml;
+  std::vector<std::shared_ptr<const SsoClient::SamlToken>> tokens;
+  tokens.reserve(kTokens);
+  // The first one fills caches that all share.
+  SsoClient::CreateSamlToken(xml);
+  const std::size_t before = HeapInUse();
+  for (std::size_t i = 0; i < kTokens; ++i) {
+    tokens.push_back(SsoClient::CreateSamlToken(xml));
+  }
+  return static_cast<double>(HeapInUse() - before) / kTokens;
+}
+
+}  // namespace Bench
