@@ -1,0 +1,97 @@
+#include <gmock/gmock.h>
+#include <tarnik/service/log.h>
+
+#include <mutex>
+
+#include "integration/sts_fixture.h"
+
+namespace SsoClient::Tests {
+namespace {
+
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+using ::testing::Not;
+
+struct Line {
+  int level;
+  std::string text;
+  bool operator==(const Line& other) const { return level == other.level && text == other.text; }
+};
+
+class LogTest : public StsTest {
+ protected:
+  LogTest() {
+    Tarnik::Service::SetLogSink([this](const Tarnik::Service::LogRecord& record) {
+      const std::lock_guard guard(mutex_);
+      if (record.logger == "SsoClient") {
+        lines_.push_back({record.level, std::string(record.text)});
+      }
+    });
+  }
+  ~LogTest() override {
+    Tarnik::Service::SetLogSink({});
+    Tarnik::Service::SetLogLevel("SsoClient", 4);
+  }
+
+  std::mutex mutex_;
+  std::vector<Line> lines_;
+};
+
+constexpr char kRequestLine[] =
+    "Requested token for subject `alice@example.com', spec `TokenSpec [tokenLifetimeSec=600, "
+    "delegable=false, delegateTo=<unset>, renewable=false, "
+    "confirmationType=0,audienceRestriction=, advice=[]'";
+
+TEST_F(LogTest, SuccessWritesItsLinesInOrder) {
+  Tarnik::Service::SetLogLevel("SsoClient", 9);
+  const auto token = Acquire();
+  EXPECT_THAT(
+      lines_,
+      ElementsAre(Line{7, "START operation SecurityTokenServiceImpl::AcquireToken"},
+                  Line{7, kRequestLine},
+                  Line{7, "SecurityTokenServiceImpl::AcquireToken sending request"},
+                  Line{7, "SecurityTokenServiceImpl::AcquireToken processing response"},
+                  Line{5, "Successfully acquired token: " + CreateSamlTokenDescription(*token)},
+                  Line{7, "END operation SecurityTokenServiceImpl::AcquireToken"}));
+}
+
+TEST_F(LogTest, FailureStillWritesTheEndLine) {
+  Tarnik::Service::SetLogLevel("SsoClient", 7);
+  EXPECT_THROW(Service()->AcquireToken(kUser, "wrong-secret", TenMinutes()),
+               InvalidCredentialsException);
+  ASSERT_FALSE(lines_.empty());
+  EXPECT_EQ(lines_.front(), (Line{7, "START operation SecurityTokenServiceImpl::AcquireToken"}));
+  EXPECT_EQ(lines_.back(), (Line{7, "END operation SecurityTokenServiceImpl::AcquireToken"}));
+}
+
+TEST_F(LogTest, LevelFiveShowsTheTokenAlone) {
+  Tarnik::Service::SetLogLevel("SsoClient", 5);
+  Acquire();
+  ASSERT_EQ(lines_.size(), 1U);
+  EXPECT_EQ(lines_[0].level, 5);
+  EXPECT_THAT(lines_[0].text, HasSubstr("Successfully acquired token: SamlToken [subject="));
+}
+
+TEST_F(LogTest, ByDefaultSuccessIsSilent) {
+  Acquire();
+  EXPECT_TRUE(lines_.empty());
+}
+
+TEST_F(LogTest, NoPasswordOrTokenTextInAnyLine) {
+  Tarnik::Service::SetLogLevel("SsoClient", 9);
+  const auto token = Acquire();
+  EXPECT_THROW(Service()->AcquireToken(kUser, "wrong-secret", TenMinutes()), SsoException);
+  Sts().ClearRequests();
+  DevSts::Misbehavior cut;
+  cut.cutOff = DevSts::CutOff{2000, DevSts::CutStyle::Reset};
+  Sts().MisbehaveNext(cut);
+  EXPECT_THROW(Acquire(), CommunicationException);
+  for (const Line& line : lines_) {
+    EXPECT_THAT(line.text, Not(HasSubstr("secret")));
+    EXPECT_THAT(line.text, Not(HasSubstr(token->Id())));
+    EXPECT_THAT(line.text, Not(HasSubstr("SignatureValue")));
+  }
+}
+
+}  // namespace
+}  // namespace SsoClient::Tests

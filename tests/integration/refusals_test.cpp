@@ -1,0 +1,231 @@
+#include <gmock/gmock.h>
+
+#include <netinet/in.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include "integration/sts_fixture.h"
+
+namespace SsoClient::Tests {
+namespace {
+
+using ::testing::HasSubstr;
+using ::testing::StartsWith;
+
+constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
+constexpr char kSecext[] =
+    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
+
+class RefusalTest : public StsTest {
+ protected:
+  static std::string CommunicationFailure() {
+    return MessageOf<CommunicationException>([] { Acquire(); });
+  }
+};
+
+TEST_F(RefusalTest, WrongPasswordIsInvalidCredentials) {
+  const std::string message = MessageOf<InvalidCredentialsException>(
+      [] { Service()->AcquireToken(kUser, "wrong-secret", TenMinutes()); });
+  EXPECT_EQ(message, "Authentication failed: Invalid credentials");
+}
+
+TEST_F(RefusalTest, UnknownUserIsInvalidCredentials) {
+  const std::string message = MessageOf<InvalidCredentialsException>(
+      [] { Service()->AcquireToken("nobody@example.com", kPassword, TenMinutes()); });
+  EXPECT_EQ(message, "Authentication failed: Invalid credentials");
+}
+
+TEST_F(RefusalTest, ExpiredPasswordIsToldApart) {
+  const std::string message = MessageOf<PasswordExpiredException>(
+      [] { Service()->AcquireToken("expired@example.com", "expired-secret", TenMinutes()); });
+  EXPECT_THAT(message,
+              StartsWith("Authentication failed: Password of the user logging on is expired"));
+}
+
+TEST_F(RefusalTest, ExpiryTextBehindOtherWordsIsNotAnExpiredPassword) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.fault =
+      DevSts::FaultAnswer{kTrust, "FailedAuthentication",
+                          "Sorry. Password of the user logging on is expired", false, 500};
+  Sts().SetMisbehavior(misbehavior);
+  EXPECT_EQ(MessageOf<InvalidCredentialsException>([] { Acquire(); }),
+            "Authentication failed: Sorry. Password of the user logging on is expired");
+}
+
+TEST_F(RefusalTest, InvalidSecurityTokenWithoutFaultstringHasNoColon) {
+  for (const char* codeNamespace : {kTrust, kSecext}) {
+    DevSts::Misbehavior misbehavior;
+    misbehavior.fault = DevSts::FaultAnswer{codeNamespace, "InvalidSecurityToken", "", true, 500};
+    Sts().SetMisbehavior(misbehavior);
+    EXPECT_EQ(MessageOf<InvalidCredentialsException>([] { Acquire(); }), "Authentication failed");
+  }
+}
+
+TEST_F(RefusalTest, FaultCodeWithoutPrefixIsUnexpected) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.fault = DevSts::FaultAnswer{"", "FailedAuthentication", "no", false, 500};
+  Sts().SetMisbehavior(misbehavior);
+  EXPECT_EQ(MessageOf<SsoException>([] { Acquire(); }),
+            "Unexpected SOAP fault: FailedAuthentication; request failed.");
+}
+
+TEST_F(RefusalTest, FaultIsReadWhateverTheSuccessStatus) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.fault = DevSts::FaultAnswer{kTrust, "FailedAuthentication", "no", false, 200};
+  Sts().SetMisbehavior(misbehavior);
+  EXPECT_EQ(MessageOf<InvalidCredentialsException>([] { Acquire(); }), "Authentication failed: no");
+}
+
+struct StatusCase {
+  int status;
+  const char* reason;
+};
+
+class StatusTest : public RefusalTest, public ::testing::WithParamInterface<StatusCase> {};
+
+TEST_P(StatusTest, IsNamedInTheMessageAndNothingIsFollowed) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.httpAnswer = DevSts::HttpAnswer{GetParam().status,
+                                              GetParam().reason,
+                                              {{"Location", Sts().HttpsUrl("/elsewhere")}},
+                                              "<html/>"};
+  Sts().SetMisbehavior(misbehavior);
+  EXPECT_EQ(CommunicationFailure(), "Server returned error: " + std::to_string(GetParam().status) +
+                                        " " + GetParam().reason);
+  EXPECT_EQ(Sts().Requests().size(), 1U);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Statuses, StatusTest,
+    ::testing::Values(StatusCase{404, "Not Found"}, StatusCase{503, "Service Unavailable"},
+                      StatusCase{301, "Moved Permanently"}, StatusCase{302, "Found"},
+                      StatusCase{303, "See Other"}, StatusCase{307, "Temporary Redirect"},
+                      StatusCase{308, "Permanent Redirect"}, StatusCase{300, "Multiple Choices"},
+                      StatusCase{401, "Unauthorized"}, StatusCase{502, "Bad Gateway"}));
+
+TEST_F(RefusalTest, GarbageInsteadOfXmlIsToldApart) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.httpAnswer = DevSts::HttpAnswer{200, "OK", {}, "this is no XML"};
+  Sts().SetMisbehavior(misbehavior);
+  EXPECT_THAT(MessageOf<SsoException>([] { Acquire(); }),
+              StartsWith("Response is not well-formed XML: "));
+}
+
+TEST_F(RefusalTest, XmlThatIsNoAnswerIsRefused) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.httpAnswer = DevSts::HttpAnswer{200, "OK", {}, "<html><p/></html>"};
+  Sts().SetMisbehavior(misbehavior);
+  EXPECT_EQ(MessageOf<SsoException>([] { Acquire(); }),
+            "Unexpected response format: missing SAOP Body.");
+}
+
+TEST_F(RefusalTest, GarbageInsteadOfHttpIsACommunicationFailure) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.rawAnswer = "220 mail.example ESMTP ready\r\n\r\n";
+  misbehavior.closeUnannounced = true;
+  Sts().SetMisbehavior(misbehavior);
+  EXPECT_FALSE(CommunicationFailure().empty());
+}
+
+TEST_F(RefusalTest, NobodyListens) {
+  // A port that was free a moment ago and that nobody listens on.
+  const int probe = socket(AF_INET, SOCK_STREAM, 0);
+  sockaddr_in address{};
+  address.sin_family = AF_INET;
+  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+  socklen_t length = sizeof address;
+  ASSERT_EQ(bind(probe, reinterpret_cast<sockaddr*>(&address), length), 0);
+  ASSERT_EQ(getsockname(probe, reinterpret_cast<sockaddr*>(&address), &length), 0);
+  const std::string endpoint = "127.0.0.1:" + std::to_string(ntohs(address.sin_port));
+  const auto service = MakeService(Sts(), "https://" + endpoint + "/sts");
+  const std::string message = MessageOf<CommunicationException>(
+      [&] { service->AcquireToken(kUser, kPassword, TenMinutes()); });
+  EXPECT_THAT(message, HasSubstr(endpoint));
+  EXPECT_THAT(message, HasSubstr("refused"));
+  close(probe);
+}
+
+TEST_F(RefusalTest, UnknownHostNameIsNamed) {
+  const auto service = MakeService(Sts(), "https://sts.invalid/sts");
+  EXPECT_THAT(MessageOf<CommunicationException>(
+                  [&] { service->AcquireToken(kUser, kPassword, TenMinutes()); }),
+              HasSubstr("sts.invalid"));
+}
+
+class ConfigurationTest : public StsTest {};
+
+TEST_F(ConfigurationTest, HttpsWithoutAnSslContextIsRefused) {
+  SecurityTokenServiceConfig config;
+  config.url = "https://localhost/sts";
+  config.tokenFactory = CreateSamlTokenFactory(nullptr);
+  EXPECT_EQ(
+      MessageOf<Tarnik::InvalidArgumentException>([&] { CreateSecurityTokenService(config); }),
+      "HTTPS connection requested but no SSLContext provided.");
+}
+
+TEST_F(ConfigurationTest, MalformedUrlIsRefused) {
+  SecurityTokenServiceConfig config;
+  config.tokenFactory = CreateSamlTokenFactory(nullptr);
+  for (const char* url :
+       {"", "ftp://localhost/", "https://", "https://a b/", "http://h\r\nX: y/"}) {
+    config.url = url;
+    EXPECT_THROW(CreateSecurityTokenService(config), Tarnik::InvalidArgumentException) << url;
+  }
+}
+
+TEST_F(ConfigurationTest, LifetimeMustBePositive) {
+  for (const long lifetime : {0L, -1L}) {
+    TokenSpec spec;
+    spec.tokenLifetimeSec = lifetime;
+    EXPECT_EQ(MessageOf<Tarnik::InvalidArgumentException>([&] { Acquire(spec); }),
+              "Token lifetime must be positive");
+  }
+  EXPECT_TRUE(Sts().Requests().empty());
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 1;
+  EXPECT_NE(Acquire(spec), nullptr);
+}
+
+struct UnsendableCase {
+  const char* name;
+  std::string text;
+};
+
+class UnsendableTextTest : public StsTest, public ::testing::WithParamInterface<UnsendableCase> {};
+
+TEST_P(UnsendableTextTest, IsRefusedBeforeAnythingIsSent) {
+  const std::string& text = GetParam().text;
+  TokenSpec audience = TenMinutes();
+  audience.audienceRestriction = {text};
+  TokenSpec delegate = TenMinutes();
+  delegate.delegateTo = text;
+  TokenSpec source = TenMinutes();
+  source.advice = {{text, {}}};
+  TokenSpec attribute = TenMinutes();
+  attribute.advice = {{"s", {{text, {}}}}};
+  TokenSpec value = TenMinutes();
+  value.advice = {{"s", {{"a", {text}}}}};
+  const auto service = Service();
+  for (const auto& spec : {audience, delegate, source, attribute, value}) {
+    EXPECT_THROW(service->AcquireToken(kUser, kPassword, spec), Tarnik::InvalidArgumentException);
+  }
+  EXPECT_THROW(service->AcquireToken(text, kPassword, TenMinutes()),
+               Tarnik::InvalidArgumentException);
+  const std::string message = MessageOf<Tarnik::InvalidArgumentException>(
+      [&] { service->AcquireToken(kUser, text, TenMinutes()); });
+  EXPECT_THAT(message, HasSubstr("wsse:Password"));
+  EXPECT_THAT(message, ::testing::Not(HasSubstr("secret")));
+  EXPECT_TRUE(Sts().Requests().empty());
+}
+
+INSTANTIATE_TEST_SUITE_P(Texts, UnsendableTextTest,
+                         ::testing::Values(UnsendableCase{"Nul", std::string("sec\0ret", 7)},
+                                           UnsendableCase{"Control", "secret\x01"},
+                                           UnsendableCase{"BrokenUtf8", "secret\xC3"},
+                                           UnsendableCase{"OverlongUtf8", "secret\xC0\x80"},
+                                           UnsendableCase{"Surrogate", "secret\xED\xA0\x80"},
+                                           UnsendableCase{"Fffe", "secret\xEF\xBF\xBE"}),
+                         [](const auto& info) { return info.param.name; });
+
+}  // namespace
+}  // namespace SsoClient::Tests

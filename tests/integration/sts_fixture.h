@@ -1,0 +1,60 @@
+#ifndef TESTS_INTEGRATION_STS_FIXTURE_H
+#define TESTS_INTEGRATION_STS_FIXTURE_H
+
+#include <devsts/server.h>
+#include <gtest/gtest.h>
+#include <ssoclient/ssoclient.h>
+#include <tarnik/crypto/certificate.h>
+
+#include <memory>
+#include <string>
+
+namespace SsoClient::Tests {
+
+inline constexpr char kUser[] = "alice@example.com";
+inline constexpr char kPassword[] = "alice-secret";
+
+/// TLS trust in the CA of `server`.
+Tarnik::Ref<Tarnik::Ssl::SSLContext> TrustCa(const DevSts::Server& server);
+
+/// A resolver that trusts the first certificate of `pem` alone.
+Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> TrustSigner(const std::string& pem);
+
+/// A service for `url` that trusts `server`'s CA and signing key.
+std::shared_ptr<SecurityTokenService> MakeService(const DevSts::Server& server,
+                                                  const std::string& url);
+
+/// A spec for ten minutes, nothing else asked for.
+TokenSpec TenMinutes();
+
+/// The message of the `Expected` that `action` throws; another exception passes through, none fails
+/// the test.
+template <class Expected, class Action>
+std::string MessageOf(Action&& action) {
+  try {
+    action();
+  } catch (const Expected& e) {
+    EXPECT_EQ(typeid(e), typeid(Expected));
+    return e.Message();
+  }
+  ADD_FAILURE() << "nothing was thrown";
+  return {};
+}
+
+/// One dev STS for all tests of the process, well-behaved at the start of each test.
+class StsTest : public ::testing::Test {
+ protected:
+  StsTest();
+
+  static DevSts::Server& Sts();
+  static std::shared_ptr<SecurityTokenService> Service() {
+    return MakeService(Sts(), Sts().HttpsUrl());
+  }
+  static std::shared_ptr<const SamlToken> Acquire(const TokenSpec& spec = TenMinutes()) {
+    return Service()->AcquireToken(kUser, kPassword, spec);
+  }
+};
+
+}  // namespace SsoClient::Tests
+
+#endif
