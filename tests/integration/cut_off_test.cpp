@@ -1,0 +1,71 @@
+#include <gmock/gmock.h>
+
+#include "integration/sts_fixture.h"
+
+namespace SsoClient::Tests {
+namespace {
+
+class CutOffTest : public StsTest {
+ protected:
+  static std::shared_ptr<SecurityTokenService> PlainService() {
+    return MakeService(Sts(), Sts().HttpUrl());
+  }
+
+  // Every cut of the answer must be a failure of the exchange, whatever of it arrived.
+  static void ExpectRefusedAt(const SecurityTokenService& service, std::size_t offset,
+                              DevSts::CutStyle style) {
+    DevSts::Misbehavior cut;
+    cut.cutOff = DevSts::CutOff{offset, style};
+    Sts().MisbehaveNext(cut);
+    EXPECT_THROW(service.AcquireToken(kUser, kPassword, TenMinutes()), CommunicationException)
+        << "cut after " << offset << " bytes";
+  }
+
+  // Octets of the answer's head and body, at least: the token's text lies within.
+  static std::size_t AnswerLength() { return Acquire()->Xml().size(); }
+};
+
+TEST_F(CutOffTest, AnswerEndedEarlyOverTcpIsRefused) {
+  const std::size_t length = AnswerLength();
+  const auto service = PlainService();
+  for (std::size_t offset = 0; offset < length; offset += offset < 300 ? 1 : 37) {
+    ExpectRefusedAt(*service, offset, DevSts::CutStyle::Orderly);
+  }
+}
+
+TEST_F(CutOffTest, AnswerResetOverTcpIsRefused) {
+  const std::size_t length = AnswerLength();
+  const auto service = PlainService();
+  for (std::size_t offset = 0; offset < length; offset += 53) {
+    ExpectRefusedAt(*service, offset, DevSts::CutStyle::Reset);
+  }
+}
+
+TEST_F(CutOffTest, AnswerEndedEarlyOverTlsIsRefused) {
+  const std::size_t length = AnswerLength();
+  const auto service = Service();
+  for (const auto style :
+       {DevSts::CutStyle::Orderly, DevSts::CutStyle::WithoutNotice, DevSts::CutStyle::Reset}) {
+    for (std::size_t offset = 0; offset < length; offset += 97) {
+      ExpectRefusedAt(*service, offset, style);
+    }
+  }
+}
+
+TEST_F(CutOffTest, AnswerWithoutLengthCutWithoutNoticeIsRefused) {
+  DevSts::Misbehavior cut;
+  cut.rawAnswer =
+      "HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\nConnection: close\r\n\r\n<soapenv:Envelope";
+  cut.cutOff = DevSts::CutOff{90, DevSts::CutStyle::WithoutNotice};
+  Sts().MisbehaveNext(cut);
+  EXPECT_THROW(Acquire(), CommunicationException);
+}
+
+TEST_F(CutOffTest, ServiceGoesOnAfterwards) {
+  const auto service = Service();
+  ExpectRefusedAt(*service, 100, DevSts::CutStyle::Reset);
+  EXPECT_NE(service->AcquireToken(kUser, kPassword, TenMinutes()), nullptr);
+}
+
+}  // namespace
+}  // namespace SsoClient::Tests
