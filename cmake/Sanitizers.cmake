@@ -4,7 +4,7 @@ set(SSOCLIENT_SANITIZER "" CACHE STRING "Sanitizers to build with: address,undef
 if(SSOCLIENT_SANITIZER)
   add_compile_options(-fsanitize=${SSOCLIENT_SANITIZER} -fno-omit-frame-pointer -O1 -g1)
   # Instrumented code makes GCC's flow analysis report what cannot happen.
-  add_compile_options(-Wno-maybe-uninitialized)
+  add_compile_options($<$<CXX_COMPILER_ID:GNU>:-Wno-maybe-uninitialized>)
   add_link_options(-fsanitize=${SSOCLIENT_SANITIZER})
   if(SSOCLIENT_SANITIZER MATCHES "undefined")
     add_compile_options(-fno-sanitize-recover=undefined)
