@@ -18,12 +18,18 @@ class TARNIK_EXPORT TCPClientSocket : public Stream {
 
   /// Resolves `host` (a name or a literal IPv4 or IPv6 address, without brackets) and connects to
   /// `port`, trying each of its addresses in turn. The completion gets this socket and null, or
-  /// this socket and an `IOException` that names host, port and the last cause. Called once per
-  /// socket.
+  /// this socket and an `IOException` that names host, port and the last cause, or a
+  /// `CancelledException` after `Close`. Called once per socket.
+  ///
+  /// Throws `InvalidArgumentException` when `host` can be no host's name (empty, too long, blanks,
+  /// control characters, brackets, ...) or `port` is not 1 to 65535, and `InvalidStateException`
+  /// when the socket was told to connect before. Reads and writes throw `InvalidStateException`
+  /// before the connection stands and while another of their kind is under way.
   virtual void ConnectAsync(const std::string& host, int port, ConnectCompletion completion) = 0;
 };
 
-/// A new, unconnected socket whose completions run on the I/O threads of `pool`.
+/// A new, unconnected socket whose completions run on the I/O threads of `pool`. Throws
+/// `InvalidArgumentException` unless `pool` is the one that `GetThreadPool` returns.
 TARNIK_EXPORT Ref<TCPClientSocket> CreateTCPClientSocket(ThreadPool* pool);
 
 }  // namespace Tarnik::System

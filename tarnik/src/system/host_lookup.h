@@ -1,0 +1,28 @@
+#ifndef TARNIK_SYSTEM_HOST_LOOKUP_H
+#define TARNIK_SYSTEM_HOST_LOOKUP_H
+
+#include <sys/socket.h>
+
+#include <string>
+#include <vector>
+
+namespace Tarnik::System {
+
+/// A socket address of any family.
+struct SocketAddress {
+  sockaddr_storage storage;
+  socklen_t length;
+};
+
+/// What a look-up has found: addresses in the order in which to try them, or why there are none.
+struct HostAddresses {
+  std::vector<SocketAddress> addresses;
+  std::string error;
+};
+
+/// Asks the system's resolver; blocks unless `host` is an address literal.
+HostAddresses LookUpHost(const std::string& host, int port);
+
+}  // namespace Tarnik::System
+
+#endif

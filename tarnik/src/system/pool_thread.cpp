@@ -1,0 +1,49 @@
+#include "system/pool_thread.h"
+
+#include <pthread.h>
+#include <signal.h>
+#include <unistd.h>
+
+#include <thread>
+#include <utility>
+
+namespace Tarnik::System {
+namespace {
+
+// A new thread inherits its creator's signal mask.
+class SignalBlock {
+ public:
+  SignalBlock() {
+    sigset_t blocked;
+    sigfillset(&blocked);
+    for (const int raisedByTheThread :
+         {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGABRT, SIGTRAP, SIGSYS, SIGPROF}) {
+      sigdelset(&blocked, raisedByTheThread);
+    }
+    pthread_sigmask(SIG_SETMASK, &blocked, &previous_);
+  }
+  ~SignalBlock() { pthread_sigmask(SIG_SETMASK, &previous_, nullptr); }
+  SignalBlock(const SignalBlock&) = delete;
+  SignalBlock& operator=(const SignalBlock&) = delete;
+
+ private:
+  sigset_t previous_;
+};
+
+}  // namespace
+
+void StartPoolThread(const char* name, std::function<void()> body) {
+  const SignalBlock block;
+  std::thread([name, body = std::move(body)] {
+    pthread_setname_np(pthread_self(), name);
+    body();
+  }).detach();
+}
+
+void ParkThread() noexcept {
+  for (;;) {
+    pause();
+  }
+}
+
+}  // namespace Tarnik::System

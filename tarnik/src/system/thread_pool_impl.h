@@ -1,0 +1,59 @@
+#ifndef TARNIK_SYSTEM_THREAD_POOL_IMPL_H
+#define TARNIK_SYSTEM_THREAD_POOL_IMPL_H
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/system/thread_pool.h>
+#include <chrono>
+#include <condition_variable>
+#include <cstddef>
+#include <memory>
+#include <mutex>
+
+#include "system/worker_set.h"
+
+namespace boost::asio {
+class io_context;
+}
+
+namespace Tarnik::System {
+
+class ThreadPoolImpl final : public ThreadPool, public ObjectImpl {
+ public:
+  ThreadPoolImpl();
+  ~ThreadPoolImpl() override;
+
+  void Run(std::function<void()> item) override;
+  void Post(std::function<void()> completion) override;
+  Ref<CancellableItem> RunAfter(unsigned long microseconds,
+                                std::function<void()> completion) override;
+  std::string ToString() const override { return "<ThreadPool>"; }
+
+  boost::asio::io_context& IoContext() noexcept { return *ioContext_; }
+
+  /// Runs `lookup`, which may block but waits for nothing that the pool does. Name look-ups have
+  /// threads of their own, so that work items which fill the pool and wait for connections cannot
+  /// keep those connections from being made.
+  void RunLookup(std::function<void()> lookup);
+
+  /// Stops everything for process exit: see `GetThreadPool`.
+  void Freeze();
+
+ private:
+  void IoLoop();
+  void WaitForIoThreads(std::chrono::milliseconds limit);
+
+  const std::unique_ptr<boost::asio::io_context> ioContext_;
+  WorkerSet workers_;
+  WorkerSet lookups_;
+
+  std::mutex mutex_;
+  std::condition_variable ioThreadStopped_;
+  std::size_t ioThreads_ = 0;
+};
+
+/// `pool` as what `GetThreadPool` returned. Throws `InvalidArgumentException` when it is another.
+ThreadPoolImpl& ToThreadPoolImpl(ThreadPool* pool);
+
+}  // namespace Tarnik::System
+
+#endif

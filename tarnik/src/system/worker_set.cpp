@@ -1,0 +1,108 @@
+#include "system/worker_set.h"
+
+#include <system_error>
+#include <utility>
+
+#include "system/pool_thread.h"
+
+namespace Tarnik::System {
+namespace {
+
+thread_local const WorkerSet* ownSet = nullptr;
+
+}  // namespace
+
+WorkerSet::WorkerSet(const char* threadName, std::size_t maxWorkers,
+                     std::chrono::milliseconds idleLimit)
+    : threadName_(threadName), maxWorkers_(maxWorkers), idleLimit_(idleLimit) {}
+
+WorkerSet::~WorkerSet() {
+  std::unique_lock lock(mutex_);
+  phase_ = Phase::kEnding;
+  itemsOrEnd_.notify_all();
+  workerChanged_.wait(lock, [this] { return workers_ == 0; });
+}
+
+void WorkerSet::Run(std::function<void()> item) {
+  const std::lock_guard lock(mutex_);
+  items_.push_back(std::move(item));
+  if (phase_ != Phase::kRunning) {
+    return;
+  }
+  // Idle workers that were woken before but have not taken their item yet still count as idle, and
+  // their items still count as waiting.
+  if (items_.size() <= idle_ || workers_ == maxWorkers_) {
+    itemsOrEnd_.notify_one();
+    return;
+  }
+  try {
+    StartWorker();
+  } catch (const std::system_error&) {
+    // With a worker left the item runs later; without one nobody would ever run it.
+    if (workers_ == 0) {
+      items_.pop_back();
+      throw;
+    }
+  }
+}
+
+void WorkerSet::Freeze(std::chrono::milliseconds limit) {
+  std::unique_lock lock(mutex_);
+  phase_ = Phase::kFrozen;
+  const std::size_t ownThreads = ownSet == this ? 1 : 0;
+  workerChanged_.wait_for(lock, limit,
+                          [this, ownThreads] { return workers_ - idle_ <= ownThreads; });
+}
+
+std::size_t WorkerSet::WorkerCount() const {
+  const std::lock_guard lock(mutex_);
+  return workers_;
+}
+
+void WorkerSet::StartWorker() {
+  StartPoolThread(threadName_, [this] { WorkerLoop(); });
+  ++workers_;
+}
+
+void WorkerSet::WorkerLoop() {
+  ownSet = this;
+  std::unique_lock lock(mutex_);
+  std::function<void()> item;
+  while (WaitForItem(lock, item)) {
+    lock.unlock();
+    item();
+    item = nullptr;
+    lock.lock();
+  }
+  // Nothing of this object may be touched once the lock is released: the destructor waits for it.
+  --workers_;
+  workerChanged_.notify_all();
+}
+
+bool WorkerSet::WaitForItem(std::unique_lock<std::mutex>& lock, std::function<void()>& item) {
+  const auto deadline = std::chrono::steady_clock::now() + idleLimit_;
+  ++idle_;
+  if (phase_ == Phase::kFrozen) {
+    workerChanged_.notify_all();
+  }
+  const auto isAwaited = [this] { return phase_ == Phase::kEnding || !items_.empty(); };
+  while (phase_ == Phase::kFrozen || !isAwaited()) {
+    if (phase_ == Phase::kFrozen) {
+      lock.unlock();
+      ParkThread();
+    }
+    const bool timedOut = itemsOrEnd_.wait_until(lock, deadline) == std::cv_status::timeout;
+    if (timedOut && phase_ == Phase::kRunning && items_.empty()) {
+      break;
+    }
+  }
+  --idle_;
+  if (phase_ == Phase::kEnding || items_.empty()) {
+    return false;
+  }
+  item = std::move(items_.front());
+  items_.pop_front();
+  return true;
+}
+
+}  // namespace Tarnik::System

@@ -1,0 +1,55 @@
+#ifndef TARNIK_SYSTEM_WORKER_SET_H
+#define TARNIK_SYSTEM_WORKER_SET_H
+
+#include <chrono>
+#include <condition_variable>
+#include <cstddef>
+#include <deque>
+#include <functional>
+#include <mutex>
+
+namespace Tarnik::System {
+
+/// Threads that run items which may block. Grows while all are busy, up to a maximum; items past it
+/// queue in order. Threads idle for `idleLimit` end. Safe from any thread.
+///
+/// A set that lives as long as the process must be leaked: its threads are detached and use it.
+class WorkerSet {
+ public:
+  WorkerSet(const char* threadName, std::size_t maxWorkers, std::chrono::milliseconds idleLimit);
+  /// Waits for the items under way; those not started are dropped.
+  ~WorkerSet();
+  WorkerSet(const WorkerSet&) = delete;
+  WorkerSet& operator=(const WorkerSet&) = delete;
+
+  void Run(std::function<void()> item);
+
+  /// From now on nothing is started; threads that end an item stop where they are for good. Waits
+  /// at most `limit` for items that are under way on other threads. For process exit.
+  void Freeze(std::chrono::milliseconds limit);
+
+  std::size_t WorkerCount() const;
+
+ private:
+  enum class Phase { kRunning, kEnding, kFrozen };
+
+  void StartWorker();
+  void WorkerLoop();
+  bool WaitForItem(std::unique_lock<std::mutex>& lock, std::function<void()>& item);
+
+  const char* const threadName_;
+  const std::size_t maxWorkers_;
+  const std::chrono::milliseconds idleLimit_;
+
+  mutable std::mutex mutex_;
+  std::condition_variable itemsOrEnd_;
+  std::condition_variable workerChanged_;
+  std::deque<std::function<void()>> items_;
+  std::size_t workers_ = 0;
+  std::size_t idle_ = 0;
+  Phase phase_ = Phase::kRunning;
+};
+
+}  // namespace Tarnik::System
+
+#endif
