@@ -69,6 +69,14 @@ Descriptor LoopbackListener::Accept() const {
   return accepted;
 }
 
+bool HasIpv6Loopback() {
+  const Descriptor probe(socket(AF_INET6, SOCK_STREAM | SOCK_CLOEXEC, 0));
+  sockaddr_in6 address{};
+  address.sin6_family = AF_INET6;
+  address.sin6_addr = in6addr_loopback;
+  return bind(probe.Get(), reinterpret_cast<sockaddr*>(&address), sizeof(address)) == 0;
+}
+
 bool SendAll(int socket, const std::string& data) {
   std::size_t sent = 0;
   while (sent < data.size()) {

@@ -40,6 +40,7 @@ class LoopbackListener {
   int port_ = 0;
 };
 
+bool HasIpv6Loopback();
 /// Blocking; false when the peer has gone.
 bool SendAll(int socket, const std::string& data);
 /// Up to `size` bytes, fewer only at the end of the stream or after a reset.
