@@ -1,0 +1,18 @@
+#ifndef TARNIK_SSL_SSL_STREAM_H
+#define TARNIK_SSL_SSL_STREAM_H
+
+#include <tarnik/ssl/ssl_context.h>
+
+#include <string>
+
+#include "ssl/ssl_context_impl.h"
+
+namespace Tarnik::Ssl {
+
+/// TLS by `context` over `stream`; `name` is a label for diagnostics.
+Ref<SSLStream> CreateSSLStream(SSLContextImpl* context, System::Stream* stream,
+                               const std::string& name);
+
+}  // namespace Tarnik::Ssl
+
+#endif

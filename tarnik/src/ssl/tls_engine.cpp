@@ -1,0 +1,186 @@
+#include "ssl/tls_engine.h"
+
+#include <openssl/err.h>
+
+#include <algorithm>
+#include <cctype>
+#include <climits>
+#include <utility>
+
+#include "support/openssl_error.h"
+
+namespace Tarnik::Ssl {
+namespace {
+
+int ToInt(std::size_t size) {
+  return static_cast<int>(std::min(size, static_cast<std::size_t>(INT_MAX)));
+}
+
+std::string ToLower(std::string text) {
+  std::transform(text.begin(), text.end(), text.begin(),
+                 [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+  return text;
+}
+
+// The earliest error is the cause of those after it.
+std::string TakeReason() {
+  const unsigned long error = ERR_peek_error();
+  const char* reason = ERR_reason_error_string(error);
+  std::string text = reason == nullptr ? "unknown cause" : reason;
+  ERR_clear_error();
+  return text;
+}
+
+TlsEngine* EngineOf(const SSL* ssl) {
+  return static_cast<TlsEngine*>(SSL_get_app_data(ssl));
+}
+
+}  // namespace
+
+TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
+                     const std::string& serverName)
+    : context_(std::move(context)),
+      host_(host),
+      sessionPeer_(ToLower(host) + '\n' + ToLower(serverName)),
+      check_(serverName.empty() ? host : serverName, context_->Pinned()),
+      ssl_(SSL_new(context_->Get())) {
+  const OpenSsl::ErrorScope errors;
+  OpenSsl::OwnedBio input(BIO_new(BIO_s_mem()));
+  OpenSsl::OwnedBio output(BIO_new(BIO_s_mem()));
+  if (ssl_ == nullptr || input == nullptr || output == nullptr) {
+    throw SSLException(errors.Describe("Cannot set up TLS for " + host_));
+  }
+  input_ = input.get();
+  output_ = output.get();
+  SSL_set0_rbio(ssl_.get(), input.release());
+  SSL_set0_wbio(ssl_.get(), output.release());
+  SSL_set_app_data(ssl_.get(), this);
+  SSL_set_connect_state(ssl_.get());
+  check_.ApplyTo(ssl_.get());
+  Resume();
+}
+
+TlsEngine::~TlsEngine() {
+  if (isHandshakeDone_ && !hasFailed_) {
+    // OpenSSL takes a session for spoilt whose connection was not shut down. This one did not fail,
+    // it was merely closed without farewell.
+    SSL_set_shutdown(ssl_.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
+  }
+}
+
+void TlsEngine::Resume() {
+  const auto session = context_->Sessions().Take(sessionPeer_, SessionCache::Clock::now());
+  if (session != nullptr) {
+    SSL_set_session(ssl_.get(), session.get());
+  }
+}
+
+bool TlsEngine::Handshake() {
+  ERR_clear_error();
+  const int result = SSL_do_handshake(ssl_.get());
+  if (result == 1) {
+    if (!check_.IsAccepted(ssl_.get())) {
+      Fail("");
+    }
+    isHandshakeDone_ = true;
+    return true;
+  }
+  if (SSL_get_error(ssl_.get(), result) == SSL_ERROR_WANT_READ) {
+    return false;
+  }
+  Fail("");
+}
+
+std::optional<std::size_t> TlsEngine::Read(char* buffer, std::size_t size) {
+  ERR_clear_error();
+  const int result = SSL_read(ssl_.get(), buffer, ToInt(size));
+  if (result > 0) {
+    return static_cast<std::size_t>(result);
+  }
+  switch (SSL_get_error(ssl_.get(), result)) {
+    case SSL_ERROR_WANT_READ:
+      return std::nullopt;
+    case SSL_ERROR_ZERO_RETURN:
+      return 0;
+    default:
+      Fail("Cannot read from");
+  }
+}
+
+std::size_t TlsEngine::Write(const char* data, std::size_t size) {
+  ERR_clear_error();
+  const int result = SSL_write(ssl_.get(), data, ToInt(size));
+  if (result <= 0) {
+    Fail("Cannot write to");
+  }
+  return static_cast<std::size_t>(result);
+}
+
+void TlsEngine::Feed(const char* data, std::size_t size) {
+  if (BIO_write(input_, data, ToInt(size)) != ToInt(size)) {
+    Fail("Cannot take in data from");
+  }
+}
+
+std::size_t TlsEngine::OutputSize() const {
+  return BIO_ctrl_pending(output_);
+}
+
+std::vector<char> TlsEngine::TakeOutput() {
+  std::vector<char> taken(OutputSize());
+  const int size = taken.empty() ? 0 : BIO_read(output_, taken.data(), ToInt(taken.size()));
+  taken.resize(static_cast<std::size_t>(std::max(size, 0)));
+  return taken;
+}
+
+void TlsEngine::FailAtEndOfInput() const {
+  if (!isHandshakeDone_) {
+    throw HandshakeError("the peer closed the connection");
+  }
+  throw SSLException("The TLS connection with " + host_ +
+                     " was closed without close_notify: the data may be cut off.");
+}
+
+SSLException TlsEngine::HandshakeError(const std::string& cause) const {
+  return SSLException("TLS handshake with " + host_ + " failed: " + cause);
+}
+
+void TlsEngine::Fail(const std::string& operation) {
+  hasFailed_ = true;
+  const std::string reason = TakeReason();
+  if (!isHandshakeDone_) {
+    throw HandshakeError(check_.Failure().empty() ? reason : check_.Failure());
+  }
+  throw SSLException(operation + " the TLS connection with " + host_ + ": " + reason);
+}
+
+void TlsEngine::InstallCallbacks(SSL_CTX* context) {
+  SSL_CTX_set_verify(context, SSL_VERIFY_PEER, &TlsEngine::OnVerified);
+  SSL_CTX_set_session_cache_mode(context, SSL_SESS_CACHE_CLIENT | SSL_SESS_CACHE_NO_INTERNAL);
+  SSL_CTX_sess_set_new_cb(context, &TlsEngine::OnNewSession);
+}
+
+int TlsEngine::OnVerified(int isValid, X509_STORE_CTX* context) {
+  const auto* ssl = static_cast<const SSL*>(
+      X509_STORE_CTX_get_ex_data(context, SSL_get_ex_data_X509_STORE_CTX_idx()));
+  try {
+    return EngineOf(ssl)->check_.OnVerified(isValid == 1, context) ? 1 : 0;
+  } catch (...) {
+    return 0;  // Nothing may be thrown through OpenSSL.
+  }
+}
+
+int TlsEngine::OnNewSession(SSL* ssl, SSL_SESSION* session) {
+  // Owning it already, so that it is freed also when it cannot be kept.
+  OpenSsl::OwnedSslSession owned(session);
+  TlsEngine* engine = EngineOf(ssl);
+  try {
+    engine->context_->Sessions().Put(engine->sessionPeer_, std::move(owned),
+                                     SessionCache::Clock::now());
+  } catch (...) {
+    return 1;  // Nothing may be thrown through OpenSSL; the session is merely not resumed.
+  }
+  return 1;
+}
+
+}  // namespace Tarnik::Ssl

@@ -1,0 +1,67 @@
+#ifndef TARNIK_SSL_TLS_ENGINE_H
+#define TARNIK_SSL_TLS_ENGINE_H
+
+#include <tarnik/ssl/ssl_exception.h>
+#include <cstddef>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "ssl/peer_check.h"
+#include "ssl/ssl_context_impl.h"
+#include "support/openssl.h"
+
+namespace Tarnik::Ssl {
+
+/// The client's side of one TLS connection without its I/O: bytes from the peer go in, bytes for
+/// the peer come out. Failures are `SSLException`s; after one, nothing but `TakeOutput` may be
+/// called. Used by one thread at a time, with OpenSSL's error queue of that thread to itself.
+class TlsEngine {
+ public:
+  /// The peer must be `serverName`, or `host` if that is empty.
+  TlsEngine(Ref<SSLContextImpl> context, const std::string& host, const std::string& serverName);
+  ~TlsEngine();
+  TlsEngine(const TlsEngine&) = delete;
+  TlsEngine& operator=(const TlsEngine&) = delete;
+
+  /// Goes on with the handshake; true when it has ended well, false when it needs more input.
+  bool Handshake();
+  /// Reads 1 to `size` bytes of data; 0 at the peer's close_notify; nothing when it needs more
+  /// input.
+  std::optional<std::size_t> Read(char* buffer, std::size_t size);
+  /// Takes 1 to `size` bytes of data to send and returns how many.
+  std::size_t Write(const char* data, std::size_t size);
+
+  void Feed(const char* data, std::size_t size);
+  std::size_t OutputSize() const;
+  /// Hands over all output that there is.
+  std::vector<char> TakeOutput();
+
+  /// Fails as a handshake or, after it, as a connection that was cut off without close_notify.
+  [[noreturn]] void FailAtEndOfInput() const;
+  SSLException HandshakeError(const std::string& cause) const;
+  bool IsHandshakeDone() const noexcept { return isHandshakeDone_; }
+
+  static void InstallCallbacks(SSL_CTX* context);
+
+ private:
+  static int OnVerified(int isValid, X509_STORE_CTX* context);
+  static int OnNewSession(SSL* ssl, SSL_SESSION* session);
+
+  void Resume();
+  [[noreturn]] void Fail(const std::string& operation);
+
+  const Ref<SSLContextImpl> context_;
+  const std::string host_;
+  const std::string sessionPeer_;
+  PeerCheck check_;
+  OpenSsl::OwnedSsl ssl_;
+  BIO* input_ = nullptr;   // Owned by `ssl_`.
+  BIO* output_ = nullptr;  // Owned by `ssl_`.
+  bool isHandshakeDone_ = false;
+  bool hasFailed_ = false;
+};
+
+}  // namespace Tarnik::Ssl
+
+#endif
