@@ -83,12 +83,20 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
  private:
   friend class Tree;
   friend class TreeBuilder;
-  using ParentNode::ParentNode;
+  ElementNode(Tree& tree, const InternedName* name) noexcept
+      : ParentNode(tree, NodeKind::kElement),
+        name_(name),
+        attributeCapacity_(0),
+        declaresNamespaces_(0) {}
 
-  const InternedName* name_ = nullptr;
+  Attribute* FindQualified(std::string_view qualifiedName) const noexcept;
+  void AddAttribute(const Attribute& attribute);
+
+  const InternedName* name_;
   Attribute* attributes_ = nullptr;
   unsigned attributeCount_ = 0;
-  unsigned attributeCapacity_ = 0;
+  unsigned attributeCapacity_ : 31;
+  unsigned declaresNamespaces_ : 1;  // may stay set when the last declaration is removed
 };
 
 /// Makes an element without attributes or children. An empty prefix gives an unprefixed name.

@@ -1,6 +1,7 @@
 #ifndef TARNIK_XML_NODE_H
 #define TARNIK_XML_NODE_H
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 
@@ -26,7 +27,8 @@ enum class NodeKind : unsigned char {
 /// A reference to any node keeps its whole tree alive, and appending a node joins its tree with the
 /// new parent's; so parents, children and the texts that accessors return as views are valid as
 /// long as anything of the tree is referenced (and, for a value that is set anew, until it is set).
-/// A tree that nobody changes may be read from many threads at once.
+/// A tree that nobody changes may be read from many threads at once. The memory of a tree is
+/// cleansed before it is given back, since requests hold passwords and answers hold tokens.
 class TARNIK_EXPORT Node : public Object {
  public:
   void IncRef() const noexcept final;
@@ -42,16 +44,18 @@ class TARNIK_EXPORT Node : public Object {
   ElementNode* ParentElement() const noexcept;
   /// The next child of the same parent, or null.
   Node* NextSibling() const noexcept;
-  /// Place in the source document, counted from 1; 0 for nodes that were not parsed.
+  /// Place in the source document, counted from 1 (columns in bytes); 0 for nodes that were not
+  /// parsed.
   int Line() const noexcept { return line_; }
   int Column() const noexcept { return column_; }
 
  protected:
-  Node(Tree& tree, NodeKind kind) noexcept : tree_(&tree), kind_(kind) {}
+  Node(Tree& tree, NodeKind kind) noexcept : tree_(&tree), column_(0), kind_(kind) {}
   ~Node() override = default;
 
  private:
   friend class ParentNode;
+  friend class TextNode;
   friend class ElementNode;
   friend class Tree;
   friend class TreeBuilder;
@@ -78,7 +82,7 @@ class TARNIK_EXPORT ParentNode : public Node {
 
   /// Makes `child` the last child, taking it from the parent that it had. Throws
   /// `InvalidArgumentException` when `child` is null, a document, or this node or one that holds
-  /// it.
+  /// it, and when this node is a document and `child` a text or a second root element.
   void AppendChild(Node* child);
   /// Takes `child` out; it goes on living in this tree without a parent. Throws
   /// `InvalidArgumentException` when it is not a child of this node.

@@ -1,0 +1,196 @@
+#include "xml/expat_session.h"
+
+#include <sys/random.h>
+
+#include <cstring>
+#include <new>
+#include <string_view>
+
+#include <tarnik/text/string_util.h>
+#include <tarnik/xml/xml_parse_exception.h>
+
+namespace Tarnik::Xml {
+
+namespace {
+
+static_assert(sizeof(XML_Char) == 1, "Expat must be built for UTF-8");
+
+// Expat asks the system for a salt for each parser unless it is given one.
+unsigned long HashSalt() noexcept {
+  static const unsigned long salt = [] {
+    unsigned long value = 0;
+    if (getrandom(&value, sizeof(value), 0) != static_cast<ssize_t>(sizeof(value))) {
+      value = 0;  // leaves it to Expat
+    }
+    return value;
+  }();
+  return salt;
+}
+
+}  // namespace
+
+ExpatSession::ExpatSession(XMLHandler& handler)
+    : handler_(handler), parser_(XML_ParserCreate("UTF-8")) {
+  if (parser_ == nullptr) {
+    throw std::bad_alloc();
+  }
+  XML_Parser parser = parser_.get();
+  XML_SetHashSalt(parser, HashSalt());
+  XML_SetUserData(parser, this);
+  XML_SetXmlDeclHandler(parser, OnXmlDeclaration);
+  XML_SetStartDoctypeDeclHandler(parser, OnDoctype);
+  XML_SetElementHandler(parser, OnStartElement, OnEndElement);
+  XML_SetCharacterDataHandler(parser, OnCharacters);
+  XML_SetCommentHandler(parser, OnComment);
+  XML_SetProcessingInstructionHandler(parser, OnProcessingInstruction);
+}
+
+char* ExpatSession::Buffer(std::size_t size) {
+  auto* buffer = static_cast<char*>(XML_GetBuffer(parser_.get(), static_cast<int>(size)));
+  if (buffer == nullptr) {
+    throw std::bad_alloc();
+  }
+  buffer_ = buffer;
+  return buffer;
+}
+
+void ExpatSession::ParseBuffer(std::size_t size, bool last) {
+  if (totalBytes_ == 0) {
+    CheckFirstBytes(buffer_, size);
+  }
+  totalBytes_ += size;
+  if (totalBytes_ > kMaxDocumentBytes) {
+    throw XMLParseException(
+        "The document is longer than " + std::to_string(kMaxDocumentBytes) + " bytes", located_);
+  }
+  const XML_Status status =
+      XML_ParseBuffer(parser_.get(), static_cast<int>(size), last ? XML_TRUE : XML_FALSE);
+  if (failure_ != nullptr) {
+    std::rethrow_exception(failure_);
+  }
+  if (status != XML_STATUS_OK) {
+    ThrowSyntaxError();
+  }
+  if (!last) {
+    // What lies before the token that is not complete leaves the buffer with the next chunk.
+    Locate();
+  }
+}
+
+// Expat turns to UTF-16 when it meets these, whatever encoding it was told.
+void ExpatSession::CheckFirstBytes(const char* bytes, std::size_t size) {
+  if (size < 2) {
+    return;
+  }
+  const std::string_view start(bytes, 2);
+  if (start == "\xFE\xFF" || start == "\xFF\xFE" || start[0] == '\0' || start[1] == '\0') {
+    throw XMLParseException("The document is in UTF-16 or UTF-32; only UTF-8 is accepted",
+                            Position{1, 1});
+  }
+}
+
+// Expat can tell the place itself, but walks each byte again for it.
+const Position& ExpatSession::Locate() {
+  int offset = 0;
+  int size = 0;
+  const char* buffer = XML_GetInputContext(parser_.get(), &offset, &size);
+  const long byte = XML_GetCurrentByteIndex(parser_.get());
+  const long distance = byte - locatedByte_;
+  if (buffer == nullptr || distance <= 0 || distance > offset) {
+    return located_;
+  }
+  const char* const end = buffer + offset;
+  const char* lineStart = end - distance;
+  located_.column += static_cast<unsigned long>(distance);
+  while (const void* found =
+             std::memchr(lineStart, '\n', static_cast<std::size_t>(end - lineStart))) {
+    lineStart = static_cast<const char*>(found) + 1;
+    ++located_.line;
+    located_.column = static_cast<unsigned long>(end - lineStart) + 1;
+  }
+  locatedByte_ = byte;
+  return located_;
+}
+
+void ExpatSession::ThrowSyntaxError() {
+  const XML_Error error = XML_GetErrorCode(parser_.get());
+  if (error == XML_ERROR_NO_MEMORY) {
+    throw std::bad_alloc();
+  }
+  throw XMLParseException(XML_ErrorString(error), Locate());
+}
+
+template <class Action>
+void ExpatSession::Handle(Action action) noexcept {
+  // Expat may report a few more events after it was told to stop.
+  if (failure_ != nullptr) {
+    return;
+  }
+  try {
+    action(Locate());
+  } catch (...) {
+    failure_ = std::current_exception();
+    XML_StopParser(parser_.get(), XML_FALSE);
+  }
+}
+
+void ExpatSession::OnXmlDeclaration(void* session, const char* version, const char* encoding, int) {
+  static_cast<ExpatSession*>(session)->Handle([=](const Position& position) {
+    if (version != nullptr && std::string_view(version) != "1.0") {
+      throw XMLParseException("The document is not XML 1.0", position);
+    }
+    if (encoding != nullptr && StringUtil::ToLower(encoding) != "utf-8") {
+      throw XMLParseException("The document declares another encoding than UTF-8", position);
+    }
+  });
+}
+
+void ExpatSession::OnDoctype(void* session, const char*, const char*, const char*, int) {
+  static_cast<ExpatSession*>(session)->Handle([](const Position& position) {
+    throw XMLParseException("The document holds a DOCTYPE, which is not accepted", position);
+  });
+}
+
+void ExpatSession::OnStartElement(void* session, const char* name, const char** attributes) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) {
+    if (++self->depth_ > kMaxElementDepth) {
+      throw XMLParseException("Elements nest deeper than " + std::to_string(kMaxElementDepth),
+                              position);
+    }
+    self->attributes_.clear();
+    for (const char** next = attributes; next[0] != nullptr; next += 2) {
+      self->attributes_.push_back({next[0], next[1]});
+    }
+    self->handler_.StartElement(position, name, self->attributes_.data(), self->attributes_.size());
+  });
+}
+
+void ExpatSession::OnEndElement(void* session, const char*) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) {
+    --self->depth_;
+    self->handler_.EndElement(position);
+  });
+}
+
+void ExpatSession::OnCharacters(void* session, const char* text, int length) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) {
+    self->handler_.Characters(position, {text, static_cast<std::size_t>(length)});
+  });
+}
+
+void ExpatSession::OnComment(void* session, const char* text) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) { self->handler_.Comment(position, text); });
+}
+
+void ExpatSession::OnProcessingInstruction(void* session, const char* target, const char* text) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) {
+    self->handler_.ProcessingInstruction(position, target, text);
+  });
+}
+
+}  // namespace Tarnik::Xml

@@ -1,0 +1,65 @@
+#ifndef TARNIK_SRC_XML_EXPAT_SESSION_H
+#define TARNIK_SRC_XML_EXPAT_SESSION_H
+
+#include <expat.h>
+
+#include <cstddef>
+#include <exception>
+#include <memory>
+#include <string>
+#include <type_traits>
+#include <vector>
+
+#include <tarnik/xml/xml_parser.h>
+
+namespace Tarnik::Xml {
+
+/// One run of Expat over one document: hands what it finds to a handler and holds the limits.
+class ExpatSession {
+ public:
+  explicit ExpatSession(XMLHandler& handler);
+
+  /// Room for the next `size` bytes of the document, valid until `ParseBuffer`.
+  char* Buffer(std::size_t size);
+  /// Parses the `size` bytes that were put into the buffer.
+  void ParseBuffer(std::size_t size, bool last);
+
+ private:
+  struct Deleter {
+    void operator()(XML_Parser parser) const noexcept { XML_ParserFree(parser); }
+  };
+
+  static void OnXmlDeclaration(void* session, const char* version, const char* encoding,
+                               int standalone);
+  static void OnDoctype(void* session, const char* name, const char* systemId, const char* publicId,
+                        int hasInternalSubset);
+  static void OnStartElement(void* session, const char* name, const char** attributes);
+  static void OnEndElement(void* session, const char* name);
+  static void OnCharacters(void* session, const char* text, int length);
+  static void OnComment(void* session, const char* text);
+  static void OnProcessingInstruction(void* session, const char* target, const char* text);
+
+  // Runs `action` for an event of Expat, which no exception may pass through.
+  template <class Action>
+  void Handle(Action action) noexcept;
+
+  void CheckFirstBytes(const char* bytes, std::size_t size);
+  /// The place of the current event.
+  const Position& Locate();
+  void ThrowSyntaxError();
+
+  XMLHandler& handler_;
+  std::unique_ptr<std::remove_pointer_t<XML_Parser>, Deleter> parser_;
+  const char* buffer_ = nullptr;
+  std::size_t totalBytes_ = 0;
+  std::size_t depth_ = 0;
+  std::vector<ParsedAttribute> attributes_;
+  std::exception_ptr failure_;
+  // Where the event before the current one begins.
+  long locatedByte_ = 0;
+  Position located_{1, 1};
+};
+
+}  // namespace Tarnik::Xml
+
+#endif

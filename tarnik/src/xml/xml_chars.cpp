@@ -1,0 +1,111 @@
+#include "xml/xml_chars.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <iterator>
+
+namespace Tarnik::Xml {
+
+namespace {
+
+constexpr char32_t kInvalid = 0xFFFFFFFF;
+
+struct Range {
+  char32_t first;
+  char32_t last;
+};
+
+// XML 1.0, fifth edition, production 4, without the colon.
+constexpr Range kNameStart[] = {
+    {'A', 'Z'},       {'_', '_'},       {'a', 'z'},       {0xC0, 0xD6},     {0xD8, 0xF6},
+    {0xF8, 0x2FF},    {0x370, 0x37D},   {0x37F, 0x1FFF},  {0x200C, 0x200D}, {0x2070, 0x218F},
+    {0x2C00, 0x2FEF}, {0x3001, 0xD7FF}, {0xF900, 0xFDCF}, {0xFDF0, 0xFFFD}, {0x10000, 0xEFFFF},
+};
+// Production 4a: what may follow besides.
+constexpr Range kNameRest[] = {
+    {'-', '.'}, {'0', '9'}, {0xB7, 0xB7}, {0x300, 0x36F}, {0x203F, 0x2040},
+};
+
+template <std::size_t size>
+bool Holds(const Range (&ranges)[size], char32_t character) noexcept {
+  return std::any_of(std::begin(ranges), std::end(ranges), [character](const Range& range) {
+    return range.first <= character && character <= range.last;
+  });
+}
+
+char32_t Continuation(std::string_view text, std::size_t index) noexcept {
+  if (index >= text.size()) {
+    return kInvalid;
+  }
+  const auto byte = static_cast<unsigned char>(text[index]);
+  return (byte & 0xC0) == 0x80 ? byte & 0x3F : kInvalid;
+}
+
+// Takes the first character from `text`; RFC 3629 section 4 says which sequences are valid.
+char32_t TakeCharacter(std::string_view& text) noexcept {
+  const auto lead = static_cast<unsigned char>(text.front());
+  if (lead < 0x80) {
+    text.remove_prefix(1);
+    return lead;
+  }
+  const std::size_t length = lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
+  if (lead < 0xC2 || lead > 0xF4) {
+    return kInvalid;
+  }
+  char32_t character = lead & (0xFF >> (length + 1));
+  for (std::size_t index = 1; index < length; ++index) {
+    const char32_t bits = Continuation(text, index);
+    if (bits == kInvalid) {
+      return kInvalid;
+    }
+    character = character << 6 | bits;
+  }
+  const bool overlong = (length == 3 && character < 0x800) || (length == 4 && character < 0x10000);
+  const bool surrogate = character >= 0xD800 && character <= 0xDFFF;
+  if (overlong || surrogate || character > 0x10FFFF) {
+    return kInvalid;
+  }
+  text.remove_prefix(length);
+  return character;
+}
+
+bool IsXmlCharacter(char32_t character) noexcept {
+  if (character < 0x20) {
+    return character == '\t' || character == '\n' || character == '\r';
+  }
+  return character != 0xFFFE && character != 0xFFFF && character != kInvalid;
+}
+
+}  // namespace
+
+bool IsXmlText(std::string_view text) noexcept {
+  while (!text.empty()) {
+    if (!IsXmlCharacter(TakeCharacter(text))) {
+      return false;
+    }
+  }
+  return true;
+}
+
+bool IsNCName(std::string_view name) noexcept {
+  if (name.empty() || !Holds(kNameStart, TakeCharacter(name))) {
+    return false;
+  }
+  while (!name.empty()) {
+    const char32_t character = TakeCharacter(name);
+    if (!Holds(kNameStart, character) && !Holds(kNameRest, character)) {
+      return false;
+    }
+  }
+  return true;
+}
+
+bool IsQualifiedName(std::string_view name) noexcept {
+  const std::size_t colon = name.find(':');
+  if (colon == std::string_view::npos) {
+    return IsNCName(name);
+  }
+  return IsNCName(name.substr(0, colon)) && IsNCName(name.substr(colon + 1));
+}
+
+}  // namespace Tarnik::Xml

@@ -1,0 +1,20 @@
+#ifndef TARNIK_SRC_XML_XML_CHARS_H
+#define TARNIK_SRC_XML_XML_CHARS_H
+
+#include <string_view>
+
+namespace Tarnik::Xml {
+
+/// True when `text` is UTF-8 and holds nothing but characters of XML 1.0 (section 2.2).
+bool IsXmlText(std::string_view text) noexcept;
+
+/// True for a name without a colon (Namespaces in XML 1.0, section 3; the characters of XML 1.0,
+/// fifth edition, section 2.3).
+bool IsNCName(std::string_view name) noexcept;
+
+/// True for "local" and "prefix:local" with NCNames (Namespaces in XML 1.0, section 4).
+bool IsQualifiedName(std::string_view name) noexcept;
+
+}  // namespace Tarnik::Xml
+
+#endif
