@@ -1,0 +1,34 @@
+#ifndef TARNIK_TESTS_SUPPORT_XML_TEXT_H
+#define TARNIK_TESTS_SUPPORT_XML_TEXT_H
+
+#include <string>
+#include <utility>
+
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/writer.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/xml_parser.h>
+#include <tarnik/xml/xml_writer.h>
+
+namespace Tarnik::TestSupport {
+
+inline Ref<Xml::Document> ParseXml(Reader* reader) {
+  const Ref<Xml::XMLHandler> handler = Xml::CreateXMLDocumentHandler();
+  const Ref<Object> parsed = Xml::CreateXMLParser(reader, handler.get())->Parse();
+  return Ref<Xml::Document>(CheckedCast<Xml::Document>(parsed.get()));
+}
+
+inline Ref<Xml::Document> ParseXml(std::string text) {
+  return ParseXml(CreateStringReader(std::move(text)).get());
+}
+
+inline std::string XmlText(const Xml::Node* node) {
+  const Ref<StringWriter> writer = CreateStringWriter();
+  Xml::WriteXml(node, writer.get());
+  return writer->TakeText();
+}
+
+}  // namespace Tarnik::TestSupport
+
+#endif
