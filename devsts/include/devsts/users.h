@@ -1,0 +1,32 @@
+#ifndef DEVSTS_USERS_H
+#define DEVSTS_USERS_H
+
+#include <map>
+#include <string>
+#include <vector>
+
+namespace DevSts {
+
+/// An account of the STS.
+struct User {
+  std::string password;
+  bool passwordExpired = false;
+  /// Each "DOMAIN\group".
+  std::vector<std::string> groups;
+  std::string givenName;
+  std::string surname;
+  bool isSolution = false;
+};
+
+/// Accounts by user principal name, "user@domain", letter case significant.
+using Users = std::map<std::string, User>;
+
+/// alice@example.com (password "alice-secret", groups EXAMPLE\staff and EXAMPLE\admins),
+/// bob@example.com
+/// ("bob-secret", no groups and no names), expired@example.com ("expired-secret", password expired)
+/// and the solution user machine@example.com ("machine-secret").
+Users DemoUsers();
+
+}  // namespace DevSts
+
+#endif
