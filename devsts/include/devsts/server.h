@@ -56,7 +56,8 @@ struct ReceivedRequest;
 
 /// Shape of the assertions that are issued.
 struct AssertionOptions {
-  SignOptions signing;
+  /// The exclusive form's prefix list has the prefixes that stand in xsi:type values only.
+  SignOptions signing = DefaultSigning();
   /// Key type of the signing certificate; ECDSA algorithms need an EC key.
   KeyType signingKey = KeyType::Rsa2048;
   /// Declares the assertion's namespaces on the SOAP envelope in place of the assertion.
@@ -65,6 +66,8 @@ struct AssertionOptions {
   bool indent = false;
   /// Writes a Format attribute on Issuer.
   bool issuerFormat = true;
+  /// Writes xsi:type="xs:string" on AttributeValue.
+  bool attributeValueTypes = true;
   /// Count of RenewRestrictionType and ProxyRestriction when a renewable or delegable token is
   /// asked for.
   unsigned renewCount = 10;
@@ -78,6 +81,12 @@ struct AssertionOptions {
   std::function<void(std::string& assertion)> beforeSigning;
   /// Changes the assertion's text as it stands in the answer, after it was signed.
   std::function<void(std::string& assertion)> afterSigning;
+
+  static SignOptions DefaultSigning() {
+    SignOptions options;
+    options.inclusivePrefixes = {"del", "rsa", "xs"};
+    return options;
+  }
 };
 
 struct ServerOptions {
@@ -178,6 +187,7 @@ class Server {
 
   /// Applies to every request (and, for the stalls before a request, every connection) from now on.
   void SetMisbehavior(Misbehavior misbehavior);
+  /// Forgets what both of these calls asked for.
   void ClearMisbehavior();
   /// Applies once to each of the next `count` requests, before what `SetMisbehavior` set and in the
   /// order of the calls. One with a stall before the request is used up by a connection, not by a

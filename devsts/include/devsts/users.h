@@ -21,10 +21,9 @@ struct User {
 /// Accounts by user principal name, "user@domain", letter case significant.
 using Users = std::map<std::string, User>;
 
-/// alice@example.com (password "alice-secret", groups EXAMPLE\staff and EXAMPLE\admins),
-/// bob@example.com
-/// ("bob-secret", no groups and no names), expired@example.com ("expired-secret", password expired)
-/// and the solution user machine@example.com ("machine-secret").
+/// alice@EXAMPLE.COM (password "secret", groups EXAMPLE\staff and EXAMPLE\admins, Alice Archer),
+/// bob@EXAMPLE.COM ("bob-secret", no groups and no names), expired@EXAMPLE.COM ("expired-secret",
+/// password expired) and the solution user machine@EXAMPLE.COM ("machine-secret").
 Users DemoUsers();
 
 }  // namespace DevSts

@@ -1,0 +1,44 @@
+#ifndef DEVSTS_ASSERTION_WRITER_H
+#define DEVSTS_ASSERTION_WRITER_H
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "devsts/server.h"
+#include "issue_request.h"
+#include "xml_writer.h"
+
+namespace DevSts {
+
+struct DelegateEntry {
+  std::string name;
+  Time instant;
+};
+
+// Everything that an assertion says.
+struct TokenContent {
+  std::string id;
+  std::string issuer;
+  std::string subject;
+  Time issued;
+  Time notBefore;
+  Time notOnOrAfter;
+  bool renewable = false;
+  bool delegable = false;
+  std::vector<DelegateEntry> delegates;
+  std::vector<std::string> audiences;
+  std::vector<AdviceRequest> advice;
+  User user;
+};
+
+// Namespace declarations that assertions need, for the element that carries them.
+XmlWriter::Attributes AssertionNamespaces(const std::string& vendorHost);
+
+// An unsigned assertion (SAML 2.0 Core, section 2.3.3).
+std::string WriteAssertion(const TokenContent& content, const AssertionOptions& shape,
+                           const std::string& vendorHost, const std::string& solutionHost);
+
+}  // namespace DevSts
+
+#endif

@@ -1,0 +1,27 @@
+#include "fault.h"
+
+#include "namespaces.h"
+
+namespace DevSts {
+
+void ThrowInvalidRequest(const std::string& faultString) {
+  throw Fault(kTrustNamespace, "InvalidRequest", faultString);
+}
+
+void ThrowFailedAuthentication(const std::string& faultString) {
+  throw Fault(kTrustNamespace, "FailedAuthentication", faultString);
+}
+
+void ThrowInvalidSecurity(const std::string& faultString) {
+  throw Fault(kWsseNamespace, "InvalidSecurity", faultString);
+}
+
+void ThrowInvalidSecurityToken(const std::string& faultString) {
+  throw Fault(kWsseNamespace, "InvalidSecurityToken", faultString);
+}
+
+void ThrowMessageExpired(const std::string& faultString) {
+  throw Fault(kWsuNamespace, "MessageExpired", faultString);
+}
+
+}  // namespace DevSts

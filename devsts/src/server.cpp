@@ -1,0 +1,180 @@
+#include "devsts/server.h"
+
+#include <utility>
+
+#include "connection_threads.h"
+#include "conversation.h"
+#include "listener.h"
+#include "misbehavior_plan.h"
+#include "observation.h"
+#include "service.h"
+#include "tls_context.h"
+
+namespace DevSts {
+namespace {
+
+Credential MakeAuthority() {
+  CertificateSpec spec;
+  spec.commonName = "Dev STS CA";
+  spec.isAuthority = true;
+  spec.freshKey = true;  // no server's certificate is good at another's clients
+  return MakeCertificate(spec);
+}
+
+Credential MakeSigner(KeyType keyType, bool freshKey) {
+  CertificateSpec spec;
+  spec.commonName = "Dev STS signing";
+  spec.keyType = keyType;
+  spec.freshKey = freshKey;
+  return MakeCertificate(spec);
+}
+
+std::string Bracketed(const std::string& address) {
+  return address.find(':') != std::string::npos ? "[" + address + "]" : address;
+}
+
+std::string Url(const char* scheme, const std::string& host, std::uint16_t port,
+                const std::string& path) {
+  return std::string(scheme) + "://" + host + ":" + std::to_string(port) + path;
+}
+
+}  // namespace
+
+class Server::Impl {
+ public:
+  explicit Impl(ServerOptions serverOptions)
+      : options(std::move(serverOptions)),
+        authority(MakeAuthority()),
+        signing(MakeSigner(options.assertion.signingKey, false)),
+        identity(MakeServerIdentity(options.tls, authority)),
+        tls(MakeTlsContext(options.tls, identity, authority)),
+        service(options, signing),
+        observation(options.requestLogLimit),
+        httpListener(options.address, options.httpPort,
+                     [this](int socket) { Take(socket, nullptr); }),
+        httpsListener(options.address, options.httpsPort,
+                      [this](int socket) { Take(socket, tls.get()); }) {}
+
+  ~Impl() { threads.Stop(); }
+
+  void Take(int socket, SSL_CTX* context) {
+    observation.Count([](Counters& counters) {
+      ++counters.connectionsAccepted;
+      ++counters.connectionsOpen;
+    });
+    threads.Start(
+        socket, context,
+        [this](Connection& connection, std::uint64_t id) {
+          Conversation(connection, id, {service, plan, observation, options.onRequest}).Run();
+        },
+        [this] { observation.Count([](Counters& counters) { --counters.connectionsOpen; }); });
+  }
+
+  const ServerOptions options;
+  const Credential authority;
+  const Credential signing;
+  const ServerIdentity identity;
+  const SslContextHandle tls;
+  Service service;
+  MisbehaviorPlan plan;
+  Observation observation;
+  ConnectionThreads threads;
+  // Last, so that nothing is accepted before the rest is there or after it has gone.
+  Listener httpListener;
+  Listener httpsListener;
+};
+
+Server::Server(ServerOptions options) : impl_(std::make_unique<Impl>(std::move(options))) {}
+
+Server::~Server() = default;
+
+std::uint16_t Server::HttpPort() const {
+  return impl_->httpListener.Port();
+}
+
+std::uint16_t Server::HttpsPort() const {
+  return impl_->httpsListener.Port();
+}
+
+std::string Server::HttpUrl(const std::string& path) const {
+  return Url("http", Bracketed(impl_->options.address), HttpPort(), path);
+}
+
+std::string Server::HttpsUrl(const std::string& path) const {
+  return HttpsUrlFor(Bracketed(impl_->options.address), path);
+}
+
+std::string Server::HttpsUrlFor(const std::string& host, const std::string& path) const {
+  return Url("https", host, HttpsPort(), path);
+}
+
+std::string Server::CaCertificatePem() const {
+  return impl_->authority.certificatePem;
+}
+
+std::string Server::ServerCertificatePem() const {
+  return impl_->identity.credential.certificatePem;
+}
+
+std::string Server::SigningCertificatePem() const {
+  return impl_->signing.certificatePem;
+}
+
+Credential Server::SigningCredential() const {
+  return impl_->signing;
+}
+
+Credential Server::StrangerCredential() const {
+  static const Credential stranger = MakeSigner(KeyType::Rsa2048, true);
+  return stranger;
+}
+
+Credential Server::MakeClientCredential(const std::string& commonName) const {
+  CertificateSpec spec;
+  spec.commonName = commonName;
+  spec.keyType = KeyType::Rsa2048;
+  return MakeCertificate(spec, &impl_->authority);
+}
+
+void Server::SetUsers(Users users) {
+  impl_->service.SetUsers(std::move(users));
+}
+
+void Server::SetAssertionOptions(AssertionOptions options) {
+  impl_->service.SetAssertionOptions(std::move(options));
+}
+
+void Server::SetMisbehavior(Misbehavior misbehavior) {
+  impl_->plan.Set(std::move(misbehavior));
+}
+
+void Server::ClearMisbehavior() {
+  impl_->plan.Clear();
+}
+
+void Server::MisbehaveNext(Misbehavior misbehavior, std::size_t count) {
+  impl_->plan.Next(std::move(misbehavior), count);
+}
+
+std::vector<ReceivedRequest> Server::Requests() const {
+  return impl_->observation.Requests();
+}
+
+ReceivedRequest Server::LastRequest() const {
+  return impl_->observation.LastRequest();
+}
+
+void Server::ClearRequests() {
+  impl_->observation.ClearRequests();
+}
+
+Counters Server::GetCounters() const {
+  return impl_->observation.GetCounters();
+}
+
+bool Server::WaitUntil(const std::function<bool(const Counters&)>& condition,
+                       std::chrono::milliseconds timeout) const {
+  return impl_->observation.WaitUntil(condition, timeout);
+}
+
+}  // namespace DevSts

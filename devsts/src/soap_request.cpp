@@ -1,0 +1,69 @@
+#include "soap_request.h"
+
+#include "devsts/xml_security.h"
+#include "element_reader.h"
+#include "fault.h"
+#include "namespaces.h"
+
+namespace DevSts {
+namespace {
+
+void RequireOneField(const ReceivedRequest& request, const char* name) {
+  if (request.HeaderCount(name) != 1) {
+    ThrowInvalidRequest(std::string(name) + " is not given exactly once");
+  }
+}
+
+void RequireTextXml(const ReceivedRequest& request) {
+  RequireOneField(request, "Content-Type");
+  const std::string type = request.Header("Content-Type");
+  if (type != "text/xml" && type.rfind("text/xml;", 0) != 0) {
+    ThrowInvalidRequest("Content-Type is not text/xml but " + type);
+  }
+}
+
+DocumentHandle ParseEnvelope(const std::string& body) {
+  try {
+    return ParseXml(body);
+  } catch (const XmlError& error) {
+    ThrowInvalidRequest(std::string("The request is not well-formed: ") + error.what());
+  }
+}
+
+}  // namespace
+
+std::string ReadSoapAction(const ReceivedRequest& request) {
+  if (request.method != "POST") {
+    ThrowInvalidRequest("The method is not POST but " + request.method);
+  }
+  RequireTextXml(request);
+  RequireOneField(request, "SOAPAction");
+  const std::string action = request.Header("SOAPAction");
+  if (action.size() < 2 || action.front() != '"' || action.back() != '"') {
+    ThrowInvalidRequest("SOAPAction is not in quotes: " + action);
+  }
+  return action.substr(1, action.size() - 2);
+}
+
+SoapRequest ReadEnvelope(const std::string& body) {
+  SoapRequest request{ParseEnvelope(body)};
+  xmlNode* envelope = xmlDocGetRootElement(request.document.get());
+  if (!IsElement(envelope, kSoapNamespace, "Envelope")) {
+    ThrowInvalidRequest("The request is not a SOAP 1.1 envelope");
+  }
+  RequireAttributes(envelope, {});
+  ElementReader reader(envelope);
+  request.header = reader.Expect(kSoapNamespace, "Header");
+  xmlNode* soapBody = reader.Expect(kSoapNamespace, "Body");
+  reader.End();
+  RequireAttributes(soapBody, {});
+  ElementReader bodyReader(soapBody);
+  if (bodyReader.AtEnd()) {
+    ThrowInvalidRequest("The Body is empty");
+  }
+  request.bodyEntry = bodyReader.Expect(kTrustNamespace, "RequestSecurityToken");
+  bodyReader.End();
+  return request;
+}
+
+}  // namespace DevSts

@@ -1,0 +1,27 @@
+#ifndef DEVSTS_SOAP_REQUEST_H
+#define DEVSTS_SOAP_REQUEST_H
+
+#include <string>
+
+#include "devsts/server.h"
+#include "xml_library.h"
+
+namespace DevSts {
+
+// A SOAP 1.1 request (sections 4 and 6): its envelope taken apart.
+struct SoapRequest {
+  DocumentHandle document;
+  xmlNode* header = nullptr;
+  xmlNode* bodyEntry = nullptr;
+};
+
+// The action in the SOAPAction field's quotes, after the HTTP part of the request was looked at.
+// Throws Fault.
+std::string ReadSoapAction(const ReceivedRequest& request);
+
+// Throws Fault.
+SoapRequest ReadEnvelope(const std::string& body);
+
+}  // namespace DevSts
+
+#endif
