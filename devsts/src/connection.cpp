@@ -21,6 +21,23 @@ int AsInt(std::size_t size) {
 
 }  // namespace
 
+void Connection::Prepare(SSL_CTX* tls) {
+  SSL_CTX_set_client_hello_cb(tls, ReadServerName, nullptr);
+}
+
+// RFC 6066, section 3: list length, name type 0, name length, name.
+int Connection::ReadServerName(SSL* tls, int* /*alert*/, void* /*context*/) {
+  constexpr std::size_t kPrefix = 5;
+  const unsigned char* octets = nullptr;
+  std::size_t size = 0;
+  auto* connection = static_cast<Connection*>(SSL_get_app_data(tls));
+  if (SSL_client_hello_get0_ext(tls, TLSEXT_TYPE_server_name, &octets, &size) == 1 &&
+      size > kPrefix) {
+    connection->serverName_.assign(octets + kPrefix, octets + size);
+  }
+  return SSL_CLIENT_HELLO_SUCCESS;
+}
+
 Connection::Connection(int socket, SSL_CTX* tls) : socket_(socket) {
   if (tls == nullptr) {
     return;
@@ -30,6 +47,7 @@ Connection::Connection(int socket, SSL_CTX* tls) : socket_(socket) {
     close(socket_);
     ThrowOpenSslError("TLS connection");
   }
+  SSL_set_app_data(tls_.get(), this);
 }
 
 Connection::~Connection() {
@@ -109,11 +127,6 @@ bool Connection::SessionReused() const {
 
 std::string Connection::TlsVersion() const {
   return tls_ ? SSL_get_version(tls_.get()) : "";
-}
-
-std::string Connection::ServerName() const {
-  const char* name = tls_ ? SSL_get_servername(tls_.get(), TLSEXT_NAMETYPE_host_name) : nullptr;
-  return name != nullptr ? name : "";
 }
 
 std::string Connection::PeerCertificatePem() const {

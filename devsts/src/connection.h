@@ -17,6 +17,9 @@ namespace DevSts {
 // others, and only before the object ends.
 class Connection {
  public:
+  // To be called once for each context that connections are made with.
+  static void Prepare(SSL_CTX* tls);
+
   // Takes the socket. `tls` may be null.
   Connection(int socket, SSL_CTX* tls);
   ~Connection();
@@ -38,14 +41,17 @@ class Connection {
   bool OverTls() const { return tls_ != nullptr; }
   bool SessionReused() const;
   std::string TlsVersion() const;
-  std::string ServerName() const;
+  // The server_name extension as the peer sent it, also when it resumes a session.
+  const std::string& ServerName() const { return serverName_; }
   std::string PeerCertificatePem() const;
 
  private:
+  static int ReadServerName(SSL* tls, int* alert, void* context);
   void DrainUntilEnd();
 
   const int socket_;
   SslHandle tls_;
+  std::string serverName_;
 };
 
 }  // namespace DevSts

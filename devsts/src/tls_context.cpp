@@ -1,5 +1,7 @@
 #include "tls_context.h"
 
+#include "connection.h"
+
 namespace DevSts {
 namespace {
 
@@ -139,6 +141,7 @@ SslContextHandle MakeTlsContext(const TlsOptions& options, const ServerIdentity&
   SetProtocol(context.get(), options.protocol);
   SetCertificate(context.get(), identity);
   SetResumption(context.get(), options.sessionResumption);
+  Connection::Prepare(context.get());
   if (options.requireClientCertificate) {
     RequireClients(context.get(), authority);
   }

@@ -2,6 +2,7 @@
 #define DEVSTS_RAW_CLIENT_H
 
 #include <openssl/ssl.h>
+#include <openssl/x509_vfy.h>
 
 #include <chrono>
 #include <cstdint>
@@ -33,6 +34,8 @@ class RawClient {
   std::string ReadAnswer();
   // Reads until the server ends the connection.
   std::string ReadToEnd();
+  // Appends what arrives next; false at the end.
+  bool ReadSome(std::string& text);
   // Whether nothing arrives for this long.
   bool IsSilent(std::chrono::milliseconds time) const;
 
@@ -40,8 +43,6 @@ class RawClient {
   SSL* Tls() const { return tls_.get(); }
 
  private:
-  bool ReadSome(std::string& text);
-
   int socket_;
   std::shared_ptr<SSL_CTX> context_;
   std::shared_ptr<SSL> tls_;

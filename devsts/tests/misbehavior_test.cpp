@@ -1,0 +1,331 @@
+#include "devsts/misbehavior.h"
+
+#include <gmock/gmock.h>
+
+#include <memory>
+#include <vector>
+
+#include "devsts/server.h"
+#include "raw_client.h"
+#include "request_text.h"
+
+namespace DevSts {
+namespace {
+
+using Testing::AliceEnvelope;
+using testing::AllOf;
+using Testing::ElementText;
+using Testing::Ending;
+using testing::EndsWith;
+using testing::HasSubstr;
+using Testing::kIssueAction;
+using testing::Not;
+using Testing::PostOf;
+using Testing::RawClient;
+using testing::StartsWith;
+using namespace std::chrono_literals;
+
+constexpr char kRaw[] = "HTTP/1.1 200 OK\r\nContent-Length: 10\r\n\r\n0123456789";
+
+Misbehavior Raw() {
+  Misbehavior misbehavior;
+  misbehavior.rawAnswer = kRaw;
+  return misbehavior;
+}
+
+// A client that has sent a request.
+std::unique_ptr<RawClient> Asked(const Server& server) {
+  auto client = std::make_unique<RawClient>(server.HttpPort());
+  client->Send(PostOf(AliceEnvelope(), kIssueAction));
+  return client;
+}
+
+std::unique_ptr<RawClient> AskedOverTls(const Server& server) {
+  auto client = std::make_unique<RawClient>(server.HttpsPort());
+  EXPECT_EQ(client->StartTls(server.CaCertificatePem()), X509_V_OK);
+  client->Send(PostOf(AliceEnvelope(), kIssueAction));
+  return client;
+}
+
+TEST(Misbehavior, AnswersWithAnyFault) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.fault = {"urn:any", "Code", "<why>", false, 500};
+  server.MisbehaveNext(misbehavior);
+  const std::string answer = Asked(server)->ReadAnswer();
+  EXPECT_THAT(answer, StartsWith("HTTP/1.1 500 "));
+  EXPECT_THAT(answer, HasSubstr("<faultcode xmlns:code=\"urn:any\">code:Code</faultcode>"));
+  EXPECT_EQ(ElementText(answer, "faultstring"), "&lt;why&gt;");
+  EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
+}
+
+TEST(Misbehavior, LeavesPrefixAndFaultStringOut) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.fault = {"", "FailedAuthentication", "", true, 200};
+  server.SetMisbehavior(misbehavior);
+  const std::string answer = Asked(server)->ReadAnswer();
+  EXPECT_THAT(answer, StartsWith("HTTP/1.1 200 "));
+  EXPECT_THAT(answer, HasSubstr("<faultcode>FailedAuthentication</faultcode></soapenv:Fault>"));
+}
+
+TEST(Misbehavior, AnswersWithAnyHttpAnswer) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.httpAnswer = {302, "Found", {{"Location", "https://elsewhere.example/"}}, "gone"};
+  misbehavior.setCookies = {"a=1; Path=/", "b=2"};
+  misbehavior.extraHeaders = {{"X-Extra", "yes"}};
+  server.SetMisbehavior(misbehavior);
+  EXPECT_EQ(Asked(server)->ReadAnswer(),
+            "HTTP/1.1 302 Found\r\nLocation: https://elsewhere.example/\r\n"
+            "Set-Cookie: a=1; Path=/\r\nSet-Cookie: b=2\r\nX-Extra: yes\r\n"
+            "Content-Length: 4\r\n\r\ngone");
+  server.ClearMisbehavior();
+  EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
+}
+
+TEST(Misbehavior, SendsRawOctetsBehindARawPrefix) {
+  Server server;
+  Misbehavior misbehavior = Raw();
+  misbehavior.rawPrefix = "HTTP/1.1 100 Continue\r\n\r\n";
+  misbehavior.rawAnswer = std::string("NUL\0 and \xFF", 10);
+  misbehavior.closeConnection = true;
+  server.MisbehaveNext(misbehavior);
+  EXPECT_EQ(Asked(server)->ReadToEnd(),
+            "HTTP/1.1 100 Continue\r\n\r\n" + std::string("NUL\0 and \xFF", 10));
+}
+
+TEST(Misbehavior, EditsTheEnvelope) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.editEnvelope = [](std::string& envelope) { envelope = "<other/>"; };
+  server.MisbehaveNext(misbehavior);
+  EXPECT_THAT(Asked(server)->ReadAnswer(), EndsWith("Content-Length: 8\r\n\r\n<other/>"));
+}
+
+TEST(Misbehavior, IsTakenInTheOrderOfTheCallsAndAsOftenAsAsked) {
+  Server server;
+  Misbehavior first;
+  first.httpAnswer = {201, "First", {}, ""};
+  Misbehavior second;
+  second.httpAnswer = {202, "Second", {}, ""};
+  server.MisbehaveNext(first, 2);
+  server.MisbehaveNext(second);
+  EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 201 First"));
+  EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 201 First"));
+  EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 202 Second"));
+  EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 200 OK"));
+}
+
+TEST(Misbehavior, SendsTheBodyInChunks) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.httpAnswer = {200, "OK", {}, "abcdefghijklmnopq"};
+  misbehavior.chunkSizes = {1, 10, 3};
+  server.MisbehaveNext(misbehavior);
+  EXPECT_EQ(Asked(server)->ReadAnswer(),
+            "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n"
+            "1\r\na\r\na\r\nbcdefghijk\r\n3\r\nlmn\r\n3\r\nopq\r\n0\r\n\r\n");
+}
+
+TEST(Misbehavior, PadsHeadAndBody) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.padHeaderBytes = 70'000;
+  misbehavior.padBodyBytes = 100'000;
+  server.MisbehaveNext(misbehavior);
+  const std::string answer = Asked(server)->ReadAnswer();
+  const std::size_t head = answer.find("\r\n\r\n");
+  EXPECT_GT(head, 70'000U);
+  EXPECT_GT(answer.size() - head, 100'000U);
+  EXPECT_EQ(answer.back(), ' ');
+}
+
+TEST(Misbehavior, ClosesWithAndWithoutAWord) {
+  Server server;
+  Misbehavior announced;
+  announced.closeConnection = true;
+  server.MisbehaveNext(announced);
+  EXPECT_THAT(Asked(server)->ReadToEnd(), HasSubstr("Connection: close\r\n"));
+  Misbehavior silent;
+  silent.closeUnannounced = true;
+  server.MisbehaveNext(silent);
+  EXPECT_THAT(Asked(server)->ReadToEnd(),
+              AllOf(StartsWith("HTTP/1.1 200 "), Not(HasSubstr("Connection: close"))));
+}
+
+struct CutCase {
+  const char* name;
+  CutStyle style;
+  Ending plain;
+  Ending tls;
+};
+
+class CutOffBy : public testing::TestWithParam<CutCase> {};
+
+TEST_P(CutOffBy, EndsAfterTheGivenOctets) {
+  Server server;
+  for (const std::size_t octets : {0UL, 1UL, 20UL, sizeof kRaw - 2}) {
+    Misbehavior misbehavior = Raw();
+    misbehavior.cutOff = CutOff{octets, GetParam().style};
+    server.MisbehaveNext(misbehavior, 2);
+    const std::string expected(kRaw, octets);
+
+    const auto plain = Asked(server);
+    const std::string plainOctets = plain->ReadToEnd();
+    EXPECT_EQ(plain->HowItEnded(), GetParam().plain) << octets;
+
+    const auto tls = AskedOverTls(server);
+    const std::string tlsOctets = tls->ReadToEnd();
+    EXPECT_EQ(tls->HowItEnded(), GetParam().tls) << octets;
+
+    // A reset may overtake what was sent before it.
+    if (GetParam().style != CutStyle::Reset) {
+      EXPECT_EQ(plainOctets, expected);
+      EXPECT_EQ(tlsOctets, expected);
+    }
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    EveryStyle, CutOffBy,
+    testing::Values(CutCase{"Orderly", CutStyle::Orderly, Ending::Orderly, Ending::Orderly},
+                    CutCase{"WithoutNotice", CutStyle::WithoutNotice, Ending::Orderly,
+                            Ending::Truncated},
+                    CutCase{"Reset", CutStyle::Reset, Ending::Reset, Ending::Reset}),
+    [](const auto& test) { return test.param.name; });
+
+bool WaitForStall(const Server& server) {
+  return server.WaitUntil([](const Counters& counters) { return counters.stalled == 1; });
+}
+
+bool WaitForEnd(const Server& server) {
+  return server.WaitUntil([](const Counters& counters) {
+    return counters.stalled == 0 && counters.connectionsOpen == 0;
+  });
+}
+
+TEST(Misbehavior, StallsBeforeTheHandshake) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.stall = Stall::BeforeTlsHandshake;
+  server.MisbehaveNext(misbehavior);
+  {
+    const RawClient client(server.HttpsPort());
+    ASSERT_TRUE(WaitForStall(server));
+    EXPECT_TRUE(client.IsSilent(20ms));
+  }
+  EXPECT_TRUE(WaitForEnd(server));
+  EXPECT_EQ(server.GetCounters().handshakesDone, 0U);
+}
+
+TEST(Misbehavior, StallsBeforeTheRequest) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.stall = Stall::BeforeRequest;
+  server.MisbehaveNext(misbehavior);
+  {
+    const auto client = AskedOverTls(server);
+    ASSERT_TRUE(WaitForStall(server));
+  }
+  EXPECT_TRUE(WaitForEnd(server));
+  EXPECT_EQ(server.GetCounters().handshakesDone, 1U);
+  EXPECT_EQ(server.GetCounters().requests, 0U);
+}
+
+struct StallCase {
+  const char* name;
+  Stall stall;
+  std::size_t sent;
+};
+
+class StallIn : public testing::TestWithParam<StallCase> {};
+
+TEST_P(StallIn, SendsThatMuchAndNoMore) {
+  Server server;
+  Misbehavior misbehavior = Raw();
+  misbehavior.stall = GetParam().stall;
+  server.MisbehaveNext(misbehavior);
+  const auto client = Asked(server);
+  ASSERT_TRUE(WaitForStall(server));
+  EXPECT_EQ(server.GetCounters().requests, 1U);
+  std::string got;
+  while (got.size() < GetParam().sent) {
+    ASSERT_TRUE(client->ReadSome(got));
+  }
+  EXPECT_EQ(got, std::string(kRaw, GetParam().sent));
+  EXPECT_TRUE(client->IsSilent(20ms));
+}
+
+INSTANTIATE_TEST_SUITE_P(EveryStage, StallIn,
+                         testing::Values(StallCase{"BeforeAnswer", Stall::BeforeAnswer, 0},
+                                         StallCase{"AfterHeaders", Stall::AfterHeaders,
+                                                   sizeof kRaw - 11},
+                                         StallCase{"InMidBody", Stall::InMidBody, sizeof kRaw - 6}),
+                         [](const auto& test) { return test.param.name; });
+
+TEST(Misbehavior, AStalledServerStops) {
+  auto server = std::make_unique<Server>();
+  Misbehavior misbehavior;
+  misbehavior.stall = Stall::BeforeAnswer;
+  server->SetMisbehavior(misbehavior);
+  const auto client = Asked(*server);
+  ASSERT_TRUE(WaitForStall(*server));
+  server.reset();
+  EXPECT_EQ(client->ReadToEnd(), "");
+}
+
+TEST(Misbehavior, DelaysTheAnswer) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.delayBeforeAnswer = 50ms;
+  server.MisbehaveNext(misbehavior);
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
+  EXPECT_GE(std::chrono::steady_clock::now() - start, 50ms);
+}
+
+TEST(Misbehavior, GivesUpADelayWhenThePeerGoes) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.delayBeforeAnswer = 1h;
+  server.MisbehaveNext(misbehavior);
+  {
+    const auto client = Asked(server);
+    ASSERT_TRUE(server.WaitUntil([](const Counters& counters) { return counters.delayed == 1; }));
+  }
+  EXPECT_TRUE(server.WaitUntil([](const Counters& counters) {
+    return counters.delayed == 0 && counters.connectionsOpen == 0;
+  }));
+}
+
+TEST(Misbehavior, DripsTheAnswer) {
+  Server server;
+  Misbehavior misbehavior = Raw();
+  misbehavior.drip = Drip{10, 1ms};
+  server.MisbehaveNext(misbehavior);
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_EQ(Asked(server)->ReadAnswer(), kRaw);
+  EXPECT_GE(std::chrono::steady_clock::now() - start, 4ms);
+}
+
+TEST(Server, HoldsAThousandExchangesAtOnce) {
+  constexpr std::size_t kCount = 1000;
+  Server server;
+  Misbehavior misbehavior = Raw();
+  misbehavior.delayBeforeAnswer = 1h;
+  server.SetMisbehavior(misbehavior);
+  std::vector<std::unique_ptr<RawClient>> clients;
+  for (std::size_t i = 0; i < kCount; ++i) {
+    clients.push_back(Asked(server));
+  }
+  EXPECT_TRUE(
+      server.WaitUntil([](const Counters& counters) { return counters.delayed == kCount; }, 60s));
+  EXPECT_EQ(server.GetCounters().connectionsOpen, kCount);
+  clients.clear();
+  EXPECT_TRUE(server.WaitUntil(
+      [](const Counters& counters) { return counters.connectionsOpen == 0; }, 60s));
+}
+
+}  // namespace
+}  // namespace DevSts
