@@ -137,9 +137,10 @@ class AssertionWriter {
 
   void WriteAttributeStatement() {
     xml_.Open("saml2:AttributeStatement");
-    const std::string groupName =
-        "http://" + vendorHost_ + "/schemas/attr-names/2009/01/GroupIdentity";
-    WriteAttribute(groupName, "Groups", content_.user.groups);
+    if (!content_.user.groups.empty()) {
+      WriteAttribute("http://" + vendorHost_ + "/schemas/attr-names/2009/01/GroupIdentity",
+                     "Groups", content_.user.groups);
+    }
     const std::string solutionName =
         "http://" + solutionHost_ + "/schemas/attr-names/2011/07/isSolution";
     WriteAttribute(solutionName, "Solution", {content_.user.isSolution ? "true" : "false"});

@@ -4,6 +4,7 @@
 #include <unistd.h>
 
 #include <csignal>
+#include <exception>
 #include <utility>
 
 namespace DevSts {
@@ -17,6 +18,17 @@ void BlockBrokenPipeSignal() {
   pthread_sigmask(SIG_BLOCK, &signals, nullptr);
 }
 
+using Serve = std::function<void(Connection&, std::uint64_t id)>;
+
+// A test's hook that throws costs its connection, not the process.
+void ServeQuietly(Connection& connection, std::uint64_t id, const Serve& serve) {
+  try {
+    serve(connection, id);
+  } catch (const std::exception&) {
+    connection.Abort();
+  }
+}
+
 }  // namespace
 
 void ConnectionThreads::Start(int socket, SSL_CTX* tls,
@@ -24,19 +36,22 @@ void ConnectionThreads::Start(int socket, SSL_CTX* tls,
                               const std::function<void()>& closed) {
   std::unique_lock lock(mutex_);
   if (stopped_) {
+    lock.unlock();
     close(socket);
+    closed();
     return;
   }
   const std::uint64_t id = ++lastId_;
-  Entry& entry = running_[id];
-  entry.connection = std::make_unique<Connection>(socket, tls);
-  Connection& connection = *entry.connection;
-  entry.thread = std::thread([this, id, &connection, serve, closed] {
+  auto made = std::make_unique<Connection>(socket, tls);
+  Connection& connection = *made;
+  // The thread's first look at the map waits for this lock.
+  std::thread thread([this, id, &connection, serve, closed] {
     BlockBrokenPipeSignal();
-    serve(connection, id);
+    ServeQuietly(connection, id, serve);
     Leave(id);
     closed();
   });
+  running_.emplace(id, Entry{std::move(made), std::move(thread)});
   JoinFinished(lock);
 }
 

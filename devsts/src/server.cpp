@@ -1,5 +1,6 @@
 #include "devsts/server.h"
 
+#include <stdexcept>
 #include <utility>
 
 #include "connection_threads.h"
@@ -62,12 +63,17 @@ class Server::Impl {
       ++counters.connectionsAccepted;
       ++counters.connectionsOpen;
     });
-    threads.Start(
-        socket, context,
-        [this](Connection& connection, std::uint64_t id) {
-          Conversation(connection, id, {service, plan, observation, options.onRequest}).Run();
-        },
-        [this] { observation.Count([](Counters& counters) { --counters.connectionsOpen; }); });
+    const auto closed = [this] {
+      observation.Count([](Counters& counters) { --counters.connectionsOpen; });
+    };
+    const auto serve = [this](Connection& connection, std::uint64_t id) {
+      Conversation(connection, id, {service, plan, observation, options.onRequest}).Run();
+    };
+    try {
+      threads.Start(socket, context, serve, closed);
+    } catch (const std::runtime_error&) {
+      closed();  // no thread to be had: the peer sees its connection closed
+    }
   }
 
   const ServerOptions options;

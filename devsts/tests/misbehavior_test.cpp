@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include <memory>
+#include <stdexcept>
 #include <vector>
 
 #include "devsts/server.h"
@@ -101,6 +102,15 @@ TEST(Misbehavior, EditsTheEnvelope) {
   misbehavior.editEnvelope = [](std::string& envelope) { envelope = "<other/>"; };
   server.MisbehaveNext(misbehavior);
   EXPECT_THAT(Asked(server)->ReadAnswer(), EndsWith("Content-Length: 8\r\n\r\n<other/>"));
+}
+
+TEST(Misbehavior, AHookThatThrowsCostsItsConnection) {
+  Server server;
+  Misbehavior misbehavior;
+  misbehavior.editEnvelope = [](std::string&) { throw std::runtime_error("hook"); };
+  server.MisbehaveNext(misbehavior);
+  EXPECT_EQ(Asked(server)->ReadToEnd(), "");
+  EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
 }
 
 TEST(Misbehavior, IsTakenInTheOrderOfTheCallsAndAsOftenAsAsked) {

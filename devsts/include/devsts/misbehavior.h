@@ -72,6 +72,7 @@ struct Misbehavior {
   /// Sent in front of the answer (1xx answers, for instance).
   std::string rawPrefix;
   /// Changes the SOAP envelope of whatever is answered; may run on several threads at once.
+  /// If it throws, the connection is closed without an answer.
   std::function<void(std::string& envelope)> editEnvelope;
 
   /// Further header fields of the answer; one Set-Cookie field for each of `setCookies`.
