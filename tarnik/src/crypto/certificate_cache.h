@@ -1,0 +1,41 @@
+#ifndef TARNIK_CRYPTO_CERTIFICATE_CACHE_H
+#define TARNIK_CRYPTO_CERTIFICATE_CACHE_H
+
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <cstddef>
+#include <list>
+#include <mutex>
+#include <string_view>
+#include <unordered_map>
+
+namespace Tarnik::Crypto {
+
+/// Keeps the certificates that were used last, to be found again by their DER bytes. Safe from many
+/// threads.
+class CertificateCache {
+ public:
+  explicit CertificateCache(std::size_t capacity) : capacity_(capacity) {}
+
+  /// The certificate with these bytes, or null.
+  Ref<const Certificate> Find(std::string_view der);
+  /// Adds a certificate; the one that was not used for the longest time makes room for it.
+  void Add(const Ref<const Certificate>& certificate);
+  std::size_t Size() const;
+
+ private:
+  using Order = std::list<Ref<const Certificate>>;
+
+  const std::size_t capacity_;
+  mutable std::mutex mutex_;
+  Order order_;  // the one used last in front
+  // The keys are the bytes inside the certificates.
+  std::unordered_map<std::string_view, Order::iterator> places_;
+};
+
+/// The cache of the process.
+CertificateCache& ProcessCertificateCache();
+
+}  // namespace Tarnik::Crypto
+
+#endif

@@ -1,0 +1,124 @@
+#include "crypto/certificate_impl.h"
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <chrono>
+#include <climits>
+#include <ctime>
+#include <utility>
+
+#include "crypto/public_key_impl.h"
+#include "support/openssl_error.h"
+
+namespace Tarnik::Crypto {
+namespace {
+
+// RFC 2253 section 2.4 allows UTF-8 as it is; escaped bytes would match no name written by others.
+constexpr unsigned long kNameFlags =
+    XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
+
+[[noreturn]] void ThrowBroken(const OpenSsl::ErrorScope& errors, const char* part) {
+  throw CryptoException(
+      errors.Describe(std::string("The certificate's ") + part + " cannot be decoded"));
+}
+
+OpenSsl::OwnedCertificate Decode(const std::vector<unsigned char>& der) {
+  const OpenSsl::ErrorScope errors;
+  if (der.empty()) {
+    throw CryptoException("A certificate cannot be empty.");
+  }
+  if (der.size() > LONG_MAX) {
+    throw CryptoException("The certificate is too long.");
+  }
+  const unsigned char* position = der.data();
+  OpenSsl::OwnedCertificate certificate(
+      d2i_X509(nullptr, &position, static_cast<long>(der.size())));
+  if (certificate == nullptr) {
+    throw CryptoException(errors.Describe("The certificate cannot be decoded"));
+  }
+  if (position != der.data() + der.size()) {
+    throw CryptoException("The certificate is followed by other bytes.");
+  }
+  return certificate;
+}
+
+std::string NameText(const X509_NAME* name, const char* part) {
+  const OpenSsl::ErrorScope errors;
+  const OpenSsl::OwnedBio memory(BIO_new(BIO_s_mem()));
+  if (memory == nullptr || X509_NAME_print_ex(memory.get(), name, 0, kNameFlags) < 0) {
+    ThrowBroken(errors, part);
+  }
+  char* text = nullptr;
+  const long length = BIO_get_mem_data(memory.get(), &text);
+  return length > 0 ? std::string(text, static_cast<std::size_t>(length)) : std::string();
+}
+
+std::string SerialText(const ASN1_INTEGER* serial) {
+  const OpenSsl::ErrorScope errors;
+  const OpenSsl::OwnedBigNumber number(ASN1_INTEGER_to_BN(serial, nullptr));
+  const OpenSsl::OwnedMemory<char> text(number == nullptr ? nullptr : BN_bn2dec(number.get()));
+  if (text == nullptr) {
+    ThrowBroken(errors, "serial number");
+  }
+  return text.get();
+}
+
+System::DateTime Time(const ASN1_TIME* time, const char* part) {
+  const OpenSsl::ErrorScope errors;
+  std::tm fields{};
+  // A null time would be told as the present.
+  if (time == nullptr || ASN1_TIME_to_tm(time, &fields) != 1) {
+    ThrowBroken(errors, part);
+  }
+  using namespace std::chrono;
+  const auto date =
+      year_month_day(year(fields.tm_year + 1900), month(static_cast<unsigned>(fields.tm_mon + 1)),
+                     day(static_cast<unsigned>(fields.tm_mday)));
+  const auto instant =
+      sys_days(date) + hours(fields.tm_hour) + minutes(fields.tm_min) + seconds(fields.tm_sec);
+  return System::DateTimeFromUtc(duration_cast<microseconds>(instant.time_since_epoch()).count(),
+                                 false);
+}
+
+std::vector<unsigned char> KeyIdentifier(X509* certificate) {
+  const OpenSsl::ErrorScope errors;
+  const ASN1_OCTET_STRING* identifier = X509_get0_subject_key_id(certificate);
+  if (identifier == nullptr) {
+    return {};
+  }
+  const unsigned char* bytes = ASN1_STRING_get0_data(identifier);
+  return {bytes, bytes + ASN1_STRING_length(identifier)};
+}
+
+Ref<const PublicKey> KeyOf(X509* certificate) {
+  const OpenSsl::ErrorScope errors;
+  OpenSsl::OwnedKey key(X509_get_pubkey(certificate));
+  return key == nullptr ? nullptr : Ref<const PublicKey>(new PublicKeyImpl(std::move(key)));
+}
+
+}  // namespace
+
+CertificateImpl::CertificateImpl(std::vector<unsigned char> der)
+    : der_(std::move(der)),
+      certificate_(Decode(der_)),
+      subjectName_(NameText(X509_get_subject_name(certificate_.get()), "subject name")),
+      issuerName_(NameText(X509_get_issuer_name(certificate_.get()), "issuer name")),
+      serialNumber_(SerialText(X509_get0_serialNumber(certificate_.get()))),
+      notBefore_(Time(X509_get0_notBefore(certificate_.get()), "start of validity")),
+      notAfter_(Time(X509_get0_notAfter(certificate_.get()), "end of validity")),
+      subjectKeyIdentifier_(KeyIdentifier(certificate_.get())),
+      publicKey_(KeyOf(certificate_.get())) {}
+
+CertificateImpl::~CertificateImpl() = default;
+
+Ref<const PublicKey> CertificateImpl::GetPublicKey() const {
+  if (publicKey_ == nullptr) {
+    throw CryptoException("The certificate's public key is broken or of an unknown kind.");
+  }
+  return publicKey_;
+}
+
+std::string CertificateImpl::ToString() const {
+  return "Certificate of " + subjectName_;
+}
+
+}  // namespace Tarnik::Crypto
