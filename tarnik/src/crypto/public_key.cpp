@@ -68,7 +68,8 @@ bool SetUp(EVP_PKEY_CTX* context, SignatureScheme scheme, Hash hash) {
 PublicKeyImpl::PublicKeyImpl(OpenSsl::OwnedKey key)
     : key_(std::move(key)),
       algorithm_(AlgorithmOf(key_.get())),
-      bits_(EVP_PKEY_get_bits(key_.get())) {
+      bits_(EVP_PKEY_get_bits(key_.get())),
+      valueLength_(static_cast<std::size_t>(EVP_PKEY_get_size(key_.get()))) {
   if (algorithm_ == KeyAlgorithm::kEc) {
     const OpenSsl::ErrorScope errors;
     curve_ = CurveOf(key_.get());

@@ -28,6 +28,8 @@ class PublicKeyImpl final : public PublicKey, public ObjectImpl {
   Curve NamedCurve() const noexcept { return curve_; }
   /// Length in bytes of the group's order for EC keys: of each of r and s.
   std::size_t OrderLength() const noexcept { return (static_cast<std::size_t>(bits_) + 7) / 8; }
+  /// Length in bytes of the longest signature value: for RSA the only length.
+  std::size_t ValueLength() const noexcept { return valueLength_; }
   EVP_PKEY* Handle() const noexcept { return key_.get(); }
 
   /// True when `signature` is one of `digest`, which was made with `hash`. The ECDSA signature is
@@ -51,6 +53,7 @@ class PublicKeyImpl final : public PublicKey, public ObjectImpl {
   OpenSsl::OwnedKey key_;
   KeyAlgorithm algorithm_;
   int bits_;
+  std::size_t valueLength_;
   Curve curve_ = Curve::kNone;
   mutable IdleContexts idle_[kSignatureSchemeCount * kHashCount];
 };

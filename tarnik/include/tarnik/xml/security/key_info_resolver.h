@@ -20,16 +20,18 @@ class TARNIK_EXPORT KeyInfoResolver : public virtual Object {
 };
 
 /// Trusts exactly `certificates`. A signature that carries certificates or other X.509 hints is
-/// verified with the trusted certificate that they name (a carried certificate must equal a trusted
-/// one byte for byte); one that carries no hint is verified if a single certificate is trusted.
-/// Validity dates of the certificates are not judged. Throws `InvalidArgumentException` when the
-/// list is empty or holds null.
+/// verified with the trusted certificate that they name; the most telling kind of hint that is
+/// there decides alone: carried certificates (one must equal a trusted one byte for byte), issuer
+/// and serial number, subject key identifier, subject name. Hints that name several trusted
+/// certificates choose none. A signature that carries no hint is verified if a single certificate
+/// is trusted. Validity dates of the certificates are not judged. Throws
+/// `InvalidArgumentException` when the list is empty or holds null.
 TARNIK_EXPORT Ref<const KeyInfoResolver> CreateTrustedCertificatesResolver(
     std::vector<Ref<const Crypto::Certificate>> certificates);
 
 /// As above, but a signature's certificate is chosen by the issuer that the KeyInfo names: the
-/// X509IssuerSerial, or the issuer and serial number of the certificate that is carried. A
-/// signature that names no issuer is refused.
+/// X509IssuerSerial, or else the issuer and serial number of the first certificate that is carried.
+/// A signature that names no issuer is refused.
 TARNIK_EXPORT Ref<const KeyInfoResolver> CreateCertificateIssuerResolver(
     std::vector<Ref<const Crypto::Certificate>> certificates);
 

@@ -1,0 +1,44 @@
+#include "xml/security/digest_writer.h"
+
+#include <tarnik/crypto/crypto_exception.h>
+
+#include "support/openssl_error.h"
+
+namespace Tarnik::Xml::Security {
+namespace {
+
+void Check(bool succeeded, const OpenSsl::ErrorScope& errors) {
+  if (!succeeded) {
+    throw Crypto::CryptoException(errors.Describe("The digest cannot be computed"));
+  }
+}
+
+}  // namespace
+
+DigestWriter::DigestWriter() : context_(EVP_MD_CTX_new()) {
+  const OpenSsl::ErrorScope errors;
+  Check(context_ != nullptr, errors);
+}
+
+DigestWriter::~DigestWriter() = default;
+
+void DigestWriter::Start(Crypto::Hash hash) {
+  const OpenSsl::ErrorScope errors;
+  Check(EVP_DigestInit_ex2(context_.get(), Crypto::FetchedHash(hash), nullptr) == 1, errors);
+}
+
+void DigestWriter::Write(std::string_view text) {
+  const OpenSsl::ErrorScope errors;
+  Check(EVP_DigestUpdate(context_.get(), text.data(), text.size()) == 1, errors);
+}
+
+Digest DigestWriter::Finish() {
+  const OpenSsl::ErrorScope errors;
+  Digest digest;
+  unsigned length = 0;
+  Check(EVP_DigestFinal_ex(context_.get(), digest.bytes.data(), &length) == 1, errors);
+  digest.length = length;
+  return digest;
+}
+
+}  // namespace Tarnik::Xml::Security

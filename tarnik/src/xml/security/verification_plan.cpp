@@ -1,0 +1,74 @@
+#include "xml/security/verification_plan.h"
+
+#include <tarnik/xml/security/xml_security_exception.h>
+#include <utility>
+
+#include "support/quote.h"
+#include "xml/security/reference_targets.h"
+
+namespace Tarnik::Xml::Security {
+namespace {
+
+DigestInput PlanSignedInfo(const SignatureContent& content, Crypto::Hash hash) {
+  DigestInput input;
+  input.apex = content.signedInfo;
+  input.canonicalization = RequireCanonicalizationMethod(content.canonicalizationMethod,
+                                                         content.canonicalizationMethodElement);
+  input.hash = hash;
+  return input;
+}
+
+DigestInput PlanTransforms(const Reference& reference, const ReferenceElements& elements,
+                           const ElementNode* signature) {
+  DigestInput input;
+  input.hash = RequireDigestMethod(reference.digestMethod, elements.digestMethod);
+  TransformPlan transforms = RequireTransforms(reference.transforms, elements.transforms);
+  input.omitted = transforms.enveloped ? signature : nullptr;
+  input.canonicalization = std::move(transforms.canonicalization);
+  // A reference within the document gives a node set that holds no comments, whatever the
+  // canonicalisation would write (XML-Signature, section 4.4.3.3).
+  input.canonicalization.withComments = false;
+  return input;
+}
+
+void CheckTarget(const DigestInput& input, const Reference& reference,
+                 const ElementNode* signature) {
+  if (IsWithin(input.apex, signature)) {
+    throw XmlSecurityException("The reference " + Quote(reference.uri) +
+                               " points into the signature itself.");
+  }
+  const bool encloses = IsWithin(signature, input.apex);
+  if (encloses && input.omitted == nullptr) {
+    throw XmlSecurityException("The reference " + Quote(reference.uri) +
+                               " encloses the signature without the enveloped-signature "
+                               "transform.");
+  }
+  if (!encloses && input.omitted != nullptr) {
+    throw XmlSecurityException("The reference " + Quote(reference.uri) +
+                               " has the enveloped-signature transform but does not enclose the "
+                               "signature.");
+  }
+}
+
+}  // namespace
+
+VerificationPlan PlanVerification(const ElementNode* signature, const SignatureContent& content) {
+  const SignatureMethod method =
+      RequireSignatureMethod(content.signatureMethod, content.signatureMethodElement);
+  VerificationPlan plan;
+  plan.scheme = method.scheme;
+  plan.signedInfo = PlanSignedInfo(content, method.hash);
+  plan.references.reserve(content.references.size());
+  for (std::size_t i = 0; i < content.references.size(); ++i) {
+    plan.references.push_back(
+        PlanTransforms(content.references[i], content.referenceElements[i], signature));
+  }
+  const std::vector<const Node*> targets = FindReferenceTargets(signature, content.references);
+  for (std::size_t i = 0; i < targets.size(); ++i) {
+    plan.references[i].apex = targets[i];
+    CheckTarget(plan.references[i], content.references[i], signature);
+  }
+  return plan;
+}
+
+}  // namespace Tarnik::Xml::Security
