@@ -1,0 +1,174 @@
+#include <tarnik/xml/security/key_info_resolver.h>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+
+#include "support/test_certificates.h"
+
+namespace Tarnik::Xml::Security {
+namespace {
+
+using Crypto::Certificate;
+using Tests::MakeCertificate;
+
+class Resolvers : public ::testing::Test {
+ protected:
+  static std::vector<unsigned char> DerOf(const Ref<const Certificate>& certificate) {
+    return {certificate->DerBytes(), certificate->DerBytes() + certificate->DerLength()};
+  }
+
+  const OpenSsl::OwnedKey otherKey_ = Tests::MakeEcKey("P-256");
+  const Ref<const Certificate> first_ = MakeCertificate(
+      {.commonName = "first", .issuerCommonName = "ca", .serial = "1", .withKeyIdentifier = true});
+  const Ref<const Certificate> second_ = MakeCertificate({.key = otherKey_.get(),
+                                                          .commonName = "second",
+                                                          .issuerCommonName = "ca",
+                                                          .serial = "2",
+                                                          .withKeyIdentifier = true});
+  const Ref<const Certificate> stranger_ = MakeCertificate({.key = otherKey_.get(),
+                                                            .commonName = "stranger",
+                                                            .issuerCommonName = "other",
+                                                            .serial = "3"});
+};
+
+class TrustedCertificatesResolver : public Resolvers {
+ protected:
+  const Ref<const KeyInfoResolver> resolver_ = CreateTrustedCertificatesResolver({first_, second_});
+};
+
+TEST_F(TrustedCertificatesResolver, FindsACarriedCertificateByItsBytes) {
+  KeyInfo keyInfo;
+  keyInfo.certificates = {DerOf(second_)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
+  keyInfo.certificates = {DerOf(stranger_), DerOf(first_)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
+}
+
+TEST_F(TrustedCertificatesResolver, TrustsNoCertificateThatDiffersInOneByte) {
+  KeyInfo keyInfo;
+  keyInfo.certificates = {DerOf(first_)};
+  for (const std::size_t place : {std::size_t{0}, DerOf(first_).size() - 1}) {
+    auto altered = DerOf(first_);
+    altered[place] ^= 1;
+    keyInfo.certificates = {altered};
+    EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+  }
+  auto longer = DerOf(first_);
+  longer.push_back(0);
+  keyInfo.certificates = {longer};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+TEST_F(TrustedCertificatesResolver, LooksAtNoOtherHintBesideACertificate) {
+  KeyInfo keyInfo;
+  keyInfo.subjectNames = {first_->SubjectName()};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
+  keyInfo.certificates = {DerOf(stranger_)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+TEST_F(TrustedCertificatesResolver, FindsByIssuerAndSerialNumber) {
+  KeyInfo keyInfo;
+  keyInfo.issuerSerials = {{"CN = ca, O=Test\\, Inc.", "002"}};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
+  keyInfo.issuerSerials = {{second_->IssuerName(), "20"}};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+  keyInfo.issuerSerials = {{"CN=other", "2"}};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+TEST_F(TrustedCertificatesResolver, FindsBySubjectKeyIdentifier) {
+  KeyInfo keyInfo;
+  keyInfo.subjectKeyIdentifiers = {second_->SubjectKeyIdentifier()};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
+  keyInfo.subjectKeyIdentifiers = {{1, 2, 3}};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+TEST_F(TrustedCertificatesResolver, FindsBySubjectName) {
+  KeyInfo keyInfo;
+  keyInfo.subjectNames = {"CN=second, O=Test\\, Inc."};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
+  keyInfo.subjectNames = {"CN=nobody"};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+TEST_F(TrustedCertificatesResolver, ChoosesNoneWhenAHintNamesSeveral) {
+  KeyInfo keyInfo;
+  keyInfo.subjectNames = {first_->SubjectName(), second_->SubjectName()};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+  keyInfo.subjectNames = {first_->SubjectName(), "CN=nobody"};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
+}
+
+TEST_F(TrustedCertificatesResolver, NeedsNoHintWhenOneCertificateIsTrusted) {
+  KeyInfo keyInfo;
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+  const auto single = CreateTrustedCertificatesResolver({first_});
+  EXPECT_EQ(single->Resolve(keyInfo), first_->GetPublicKey());
+  keyInfo.keyNames = {"whatever"};
+  EXPECT_EQ(single->Resolve(keyInfo), first_->GetPublicKey());
+}
+
+TEST_F(TrustedCertificatesResolver, SurvivesBrokenCertificates) {
+  KeyInfo keyInfo;
+  keyInfo.certificates = {{1, 2, 3}};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+class CertificateIssuerResolver : public Resolvers {
+ protected:
+  const Ref<const KeyInfoResolver> resolver_ = CreateCertificateIssuerResolver({first_, second_});
+};
+
+TEST_F(CertificateIssuerResolver, FindsByTheIssuerThatIsNamed) {
+  KeyInfo keyInfo;
+  keyInfo.issuerSerials = {{second_->IssuerName(), "2"}};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
+}
+
+TEST_F(CertificateIssuerResolver, FindsByTheIssuerOfACarriedCertificate) {
+  KeyInfo keyInfo;
+  keyInfo.certificates = {DerOf(first_)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
+  keyInfo.certificates = {DerOf(stranger_)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+TEST_F(CertificateIssuerResolver, GivesTheTrustedKeyWhenAStrangerCarriesItsIssuer) {
+  const auto namesake = MakeCertificate(
+      {.key = otherKey_.get(), .commonName = "first", .issuerCommonName = "ca", .serial = "1"});
+  KeyInfo keyInfo;
+  keyInfo.certificates = {DerOf(namesake)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
+  EXPECT_NE(resolver_->Resolve(keyInfo), namesake->GetPublicKey());
+}
+
+TEST_F(CertificateIssuerResolver, RefusesASignatureThatNamesNoIssuer) {
+  KeyInfo keyInfo;
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+  EXPECT_EQ(CreateCertificateIssuerResolver({first_})->Resolve(keyInfo), nullptr);
+  keyInfo.subjectNames = {first_->SubjectName()};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+  keyInfo.certificates = {{1, 2, 3}};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+template <class Create>
+void ExpectArgumentChecks(Create create) {
+  EXPECT_THROW(create({}), InvalidArgumentException);
+  EXPECT_THROW(create({MakeCertificate(), nullptr}), InvalidArgumentException);
+}
+
+TEST(KeyInfoResolvers, NeedCertificates) {
+  ExpectArgumentChecks([](std::vector<Ref<const Certificate>> certificates) {
+    CreateTrustedCertificatesResolver(std::move(certificates));
+  });
+  ExpectArgumentChecks([](std::vector<Ref<const Certificate>> certificates) {
+    CreateCertificateIssuerResolver(std::move(certificates));
+  });
+}
+
+}  // namespace
+}  // namespace Tarnik::Xml::Security
