@@ -1,0 +1,93 @@
+#include "describe/describe.h"
+
+#include <cstdint>
+#include <set>
+#include <vector>
+
+#include <ssoclient/saml_token.h>
+#include <tarnik/text/print.h>
+
+namespace SsoClient {
+namespace {
+
+using Tarnik::DatePrintFormatter;
+using Tarnik::Detail::ASPrintInternal;
+
+// A separator stands in front of an item once anything was written before, so items that are
+// described by an empty text leave no trace.
+template <class Items>
+std::string JoinByLength(const Items& items) {
+  std::string text;
+  for (const auto& item : items) {
+    if (!text.empty()) {
+      text += ", ";
+    }
+    text += Describe(item);
+  }
+  return text;
+}
+
+// A separator stands between any two items, empty ones included.
+template <class Texts>
+std::string JoinByPosition(const Texts& items) {
+  std::string text;
+  bool isFirst = true;
+  for (const std::string& item : items) {
+    if (!isFirst) {
+      text += ", ";
+    }
+    isFirst = false;
+    text += item;
+  }
+  return text;
+}
+
+}  // namespace
+
+std::string Describe(const PrincipalId& principal) {
+  return ASPrintInternal("{Name: %1; Domain:%2}", {principal.name, principal.domain});
+}
+
+std::string Describe(const PrincipalId* principal) {
+  return principal == nullptr ? std::string("(null)") : Describe(*principal);
+}
+
+std::string Describe(const Delegate& delegate) {
+  return ASPrintInternal("%1 at %2",
+                         {Describe(delegate.delegate), delegate.delegationInstant.ToString()});
+}
+
+std::string Describe(const AdviceAttribute& attribute) {
+  return ASPrintInternal("[source=%1, attributes=[%2]]",
+                         {attribute.name, JoinByPosition(attribute.values)});
+}
+
+std::string Describe(const Advice& advice) {
+  return ASPrintInternal("Advice [source=%1, attributes=[%2]]",
+                         {advice.source, JoinByLength(advice.attributes)});
+}
+
+std::string Describe(const TokenSpec& spec) {
+  return ASPrintInternal(
+      "TokenSpec [tokenLifetimeSec=%1, delegable=%2, delegateTo=%3, renewable=%4, "
+      "confirmationType=%5,audienceRestriction=%6, advice=[%7]",
+      {spec.tokenLifetimeSec, spec.delegable, spec.delegateTo.value_or("<unset>"), spec.renewable,
+       static_cast<std::int32_t>(spec.confirmation), JoinByPosition(spec.audienceRestriction),
+       JoinByLength(spec.advice)});
+}
+
+std::string CreateSamlTokenDescription(const SamlToken& token) {
+  std::vector<PrincipalId> groups;
+  token.GetGroups(groups);
+  std::vector<Delegate> delegationChain;
+  token.GetDelegationChain(delegationChain);
+  return ASPrintInternal(
+      "SamlToken [subject=%1, groups=[%2], delegationChain=[%3], startTime=%4, expirationTime=%5, "
+      "renewable=%6, delegable=%7, isSolution=%8,confirmationType=%9]",
+      {Describe(&token.Subject()), JoinByLength(groups), JoinByLength(delegationChain),
+       DatePrintFormatter(token.StartTime()), DatePrintFormatter(token.ExpirationTime()),
+       token.IsRenewable(), token.IsDelegable(), token.IsSolution(),
+       static_cast<std::int32_t>(token.ConfirmationType())});
+}
+
+}  // namespace SsoClient

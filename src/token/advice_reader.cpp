@@ -1,0 +1,49 @@
+#include "token/advice_reader.h"
+
+#include <string>
+#include <utility>
+
+#include "deployment.h"
+#include "token/attribute_reader.h"
+#include "token/attribute_rules.h"
+#include "token/element_rules.h"
+#include "token/saml_names.h"
+
+namespace SsoClient {
+namespace {
+
+using Tarnik::Xml::ElementNode;
+
+AdviceAttribute ReadAdviceAttribute(ChildCursor& cursor) {
+  const AttributeView view = ReadSamlAttribute(cursor);
+  return {std::string(view.name), {view.values.begin(), view.values.end()}};
+}
+
+Advice ReadAdviceBlock(ChildCursor& cursor) {
+  const ElementNode& element = ExpectElement(cursor.Current(), "RSAAdvice", kVendorSamlNamespace);
+  CheckAttributes(element, {"AdviceSource"});
+  Advice advice;
+  advice.source = ReadAttribute(element, "AdviceSource");
+  ChildCursor children = cursor.Into(element);
+  while (!children.IsAtEnd()) {
+    advice.attributes.push_back(ReadAdviceAttribute(children));
+  }
+  cursor.Advance();
+  return advice;
+}
+
+}  // namespace
+
+std::vector<Advice> ReadAdvice(ChildCursor& cursor) {
+  const ElementNode& element = ExpectElement(cursor.Current(), "Advice", kSamlNamespace);
+  CheckAttributes(element, {});
+  std::vector<Advice> advice;
+  ChildCursor children = cursor.Into(element);
+  while (!children.IsAtEnd()) {
+    advice.push_back(ReadAdviceBlock(children));
+  }
+  cursor.Advance();
+  return advice;
+}
+
+}  // namespace SsoClient

@@ -1,0 +1,19 @@
+#ifndef SSOCLIENT_TOKEN_ASSERTION_READER_H
+#define SSOCLIENT_TOKEN_ASSERTION_READER_H
+
+#include <tarnik/xml/element_node.h>
+
+#include "token/parsed_assertion.h"
+
+namespace SsoClient {
+
+/// Reads one SAML 2.0 assertion (SAML 2.0 core, section 2.3.3) in the one layout that this library
+/// accepts; whatever it does not expect is an error. Judges neither times nor the signature's
+/// value. `assertion` may be null, which is an error like any other node that is no Assertion.
+///
+/// Throws `ParseException` at the first fault in document order.
+ParsedAssertion ReadAssertion(Tarnik::Xml::ElementNode* assertion);
+
+}  // namespace SsoClient
+
+#endif

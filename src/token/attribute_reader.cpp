@@ -1,0 +1,41 @@
+#include "token/attribute_reader.h"
+
+#include "token/attribute_rules.h"
+#include "token/element_rules.h"
+#include "token/saml_names.h"
+
+namespace SsoClient {
+namespace {
+
+using Tarnik::Xml::ElementNode;
+
+std::string_view ReadValue(ChildCursor& cursor) {
+  const ElementNode& element = ExpectElement(cursor.Current(), "AttributeValue", kSamlNamespace);
+  CheckEachAttribute(element, {}, {kTypeAttribute});
+  // The value is text whatever its type, but a type that cannot be named is no type.
+  if (const auto type = FindTypeAttribute(element)) {
+    ResolveQNameValue(element, *type);
+  }
+  const std::string_view value = ReadTextContent(element);
+  cursor.Advance();
+  return value;
+}
+
+}  // namespace
+
+AttributeView ReadSamlAttribute(ChildCursor& cursor) {
+  const ElementNode& element = ExpectElement(cursor.Current(), "Attribute", kSamlNamespace);
+  CheckAttributes(element, {"Name"}, {"NameFormat", "FriendlyName"});
+  AttributeView attribute;
+  attribute.name = ReadAttribute(element, "Name");
+  attribute.nameFormat = element.FindAttribute("NameFormat").value_or("");
+  attribute.friendlyName = element.FindAttribute("FriendlyName").value_or("");
+  ChildCursor children = cursor.Into(element);
+  while (!children.IsAtEnd()) {
+    attribute.values.push_back(ReadValue(children));
+  }
+  cursor.Advance();
+  return attribute;
+}
+
+}  // namespace SsoClient

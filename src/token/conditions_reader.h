@@ -1,0 +1,16 @@
+#ifndef SSOCLIENT_TOKEN_CONDITIONS_READER_H
+#define SSOCLIENT_TOKEN_CONDITIONS_READER_H
+
+#include "token/child_cursor.h"
+#include "token/parsed_assertion.h"
+
+namespace SsoClient {
+
+/// Reads Conditions (SAML 2.0 core, section 2.5.1) with the restrictions that this library
+/// understands, in any order and each at most once. A condition that it does not understand makes
+/// the assertion's validity indeterminate, so it is refused. Throws `ParseException`.
+ParsedConditions ReadConditions(ChildCursor& cursor);
+
+}  // namespace SsoClient
+
+#endif

@@ -1,0 +1,126 @@
+#include "token/subject_reader.h"
+
+#include <vector>
+
+#include <ssoclient/exceptions.h>
+#include <tarnik/text/string_util.h>
+
+#include "token/attribute_rules.h"
+#include "token/concat.h"
+#include "token/element_rules.h"
+#include "token/name_id_reader.h"
+#include "token/saml_names.h"
+
+namespace SsoClient {
+namespace {
+
+using Tarnik::Xml::ElementNode;
+
+TokenConfirmationType ParseMethod(std::string_view method) {
+  if (method == "urn:oasis:names:tc:SAML:2.0:cm:bearer") {
+    return BEARER;
+  }
+  if (method == "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key") {
+    return HOLDER_OF_KEY;
+  }
+  throw ParseException(Concat({"Unknown subject confirmation method: '", method, "'"}));
+}
+
+void ExpectEnd(const ChildCursor& cursor, const char* message) {
+  if (!cursor.IsAtEnd()) {
+    throw ParseException(message);
+  }
+}
+
+Tarnik::Ref<const Tarnik::Crypto::Certificate> ReadCertificate(ChildCursor& cursor) {
+  const ElementNode& element = ExpectElement(cursor.Current(), "X509Certificate", kDsigNamespace);
+  CheckAttributes(element, {});
+  std::vector<unsigned char> der;
+  Tarnik::StringUtil::Base64Decode(ReadTextContent(element), der);
+  cursor.Advance();
+  return Tarnik::Crypto::CreateCertificateFromDer(der.data(), der.size());
+}
+
+Tarnik::Ref<const Tarnik::Crypto::Certificate> ReadX509Data(ChildCursor& cursor) {
+  const ElementNode& element = ExpectElement(cursor.Current(), "X509Data", kDsigNamespace);
+  CheckAttributes(element, {});
+  ChildCursor children = cursor.Into(element);
+  auto certificate = ReadCertificate(children);
+  ExpectEnd(children, "Unexpected elements after X509Certificate");
+  cursor.Advance();
+  return certificate;
+}
+
+Tarnik::Ref<const Tarnik::Crypto::Certificate> ReadKeyInfo(ChildCursor& cursor) {
+  const ElementNode& element = ExpectElement(cursor.Current(), "KeyInfo", kDsigNamespace);
+  CheckAttributes(element, {});
+  ChildCursor children = cursor.Into(element);
+  auto certificate = ReadX509Data(children);
+  ExpectEnd(children, "Unexpected elements after X509Data");
+  cursor.Advance();
+  return certificate;
+}
+
+// SAML 2.0 core, section 2.4.1.3: the type of data that names the holder's key.
+void CheckKeyInfoType(const ElementNode& data) {
+  const std::string_view type = FindTypeAttribute(data).value_or("");
+  if (ResolveQNameValue(data, type) != QNameView{kSamlNamespace, "KeyInfoConfirmationDataType"}) {
+    throw ParseException(Concat({"Invalid SubjectConfirmationData type: '", type, "'"}));
+  }
+}
+
+void ReadHolderOfKeyData(const ElementNode& data, ChildCursor& children, ParsedSubject& subject) {
+  CheckEachAttribute(data, {{"", "NotOnOrAfter"}, kTypeAttribute});
+  CheckKeyInfoType(data);
+  subject.notOnOrAfter = ReadDateAttribute(data, "NotOnOrAfter");
+  subject.holderOfKeyCertificate = ReadKeyInfo(children);
+  ExpectEnd(children, "Unexpected elements after SubjectConfirmationData/KeyInfo");
+}
+
+void ReadBearerData(const ElementNode& data, const ChildCursor& children, ParsedSubject& subject) {
+  CheckEachAttribute(data, {{"", "NotOnOrAfter"}});
+  subject.notOnOrAfter = ReadDateAttribute(data, "NotOnOrAfter");
+  ExpectEmpty(children);
+}
+
+void ReadConfirmationData(ChildCursor& cursor, ParsedSubject& subject) {
+  const ElementNode& data =
+      ExpectElement(cursor.Current(), "SubjectConfirmationData", kSamlNamespace);
+  ChildCursor children = cursor.Into(data);
+  if (subject.confirmationMethod == HOLDER_OF_KEY) {
+    ReadHolderOfKeyData(data, children, subject);
+  } else {
+    ReadBearerData(data, children, subject);
+  }
+  cursor.Advance();
+}
+
+void ReadConfirmation(ChildCursor& cursor, ParsedSubject& subject) {
+  const ElementNode& element =
+      ExpectElement(cursor.Current(), "SubjectConfirmation", kSamlNamespace);
+  CheckAttributes(element, {"Method"});
+  subject.confirmationMethod = ParseMethod(ReadAttribute(element, "Method"));
+  ChildCursor children = cursor.Into(element);
+  if (children.IsAtElement("NameID")) {
+    subject.delegateId = ReadPrincipal(children);
+  }
+  ReadConfirmationData(children, subject);
+  ExpectEnd(children, "Unexpected elements after SubjectConfirmationData");
+  cursor.Advance();
+}
+
+}  // namespace
+
+ParsedSubject ReadSubject(ChildCursor& cursor) {
+  const ElementNode& element = ExpectElement(cursor.Current(), "Subject", kSamlNamespace);
+  CheckAttributes(element, {});
+  ParsedSubject subject;
+  ChildCursor children = cursor.Into(element);
+  subject.principal = ReadPrincipal(children);
+  ReadConfirmation(children, subject);
+  ExpectEnd(children, "Unexpected elements after SubjectConfirmation");
+  cursor.Advance();
+  return subject;
+}
+
+}  // namespace SsoClient
