@@ -1,0 +1,192 @@
+#include "describe/describe.h"
+
+#include <optional>
+#include <set>
+
+#include <ssoclient/saml_token.h>
+
+namespace SsoClient {
+namespace {
+
+using Tarnik::System::DateTime;
+
+// A token of set values that counts how often each is asked for.
+class FakeToken final : public SamlToken {
+ public:
+  const std::string& Id() const override { return text_; }
+  const DateTime& StartTime() const override { return Count(startTime), start; }
+  const DateTime& ExpirationTime() const override { return Count(expirationTime), end; }
+  DateTime ExpirationTimeWithTolerance() const override { return end; }
+  const PrincipalId& Subject() const override { return Count(subjects), subject; }
+  bool IsRenewable() const override { return Count(renewables), renewable; }
+  bool IsDelegable() const override { return Count(delegables), delegable; }
+  bool IsSolution() const override { return Count(solutions), solution; }
+  TokenConfirmationType ConfirmationType() const override {
+    return Count(confirmations), confirmation;
+  }
+  void GetSubjectNames(SubjectNames&) const override {}
+  void GetGroups(std::vector<PrincipalId>& out) const override {
+    Count(groupLists);
+    out = groups;
+  }
+  void GetDelegationChain(std::vector<Delegate>& out) const override {
+    Count(chains);
+    out = chain;
+  }
+  void GetAudiences(std::set<std::string>&) const override {}
+  void GetAdvice(std::vector<Advice>&) const override {}
+  Tarnik::Ref<const Tarnik::Crypto::Certificate> HolderOfKeyCertificate() const override {
+    return nullptr;
+  }
+  const std::string& Issuer() const override { return text_; }
+  Tarnik::Ref<Tarnik::Xml::Security::Signature> GetSignature() const override { return nullptr; }
+  const std::string& Xml() const override { return text_; }
+
+  DateTime start = DateTime::Parse("2024-03-05T07:08:09.010Z");
+  DateTime end = DateTime::Parse("2024-03-05T08:08:09Z");
+  PrincipalId subject{"alice", "CORP"};
+  bool renewable = false;
+  bool delegable = false;
+  bool solution = false;
+  TokenConfirmationType confirmation = BEARER;
+  std::vector<PrincipalId> groups;
+  std::vector<Delegate> chain;
+
+  mutable int startTime = 0;
+  mutable int expirationTime = 0;
+  mutable int subjects = 0;
+  mutable int renewables = 0;
+  mutable int delegables = 0;
+  mutable int solutions = 0;
+  mutable int confirmations = 0;
+  mutable int groupLists = 0;
+  mutable int chains = 0;
+
+ private:
+  static void Count(int& counter) { ++counter; }
+
+  std::string text_ = "SECRET";
+};
+
+TEST(Describe, WritesPrincipalWithItsAsymmetricSpacing) {
+  EXPECT_EQ(Describe(PrincipalId{"alice", "CORP"}), "{Name: alice; Domain:CORP}");
+  EXPECT_EQ(Describe(PrincipalId{"alice", ""}), "{Name: alice; Domain:}");
+  EXPECT_EQ(Describe(PrincipalId{"", ""}), "{Name: ; Domain:}");
+}
+
+TEST(Describe, DoesNotExpandPlaceholdersInValues) {
+  EXPECT_EQ(Describe(PrincipalId{"%2", "%1"}), "{Name: %2; Domain:%1}");
+}
+
+TEST(Describe, WritesMissingPrincipalAsNull) {
+  const PrincipalId* none = nullptr;
+  EXPECT_EQ(Describe(none), "(null)");
+  const PrincipalId principal{"alice", "CORP"};
+  EXPECT_EQ(Describe(&principal), "{Name: alice; Domain:CORP}");
+}
+
+TEST(Describe, WritesDelegateWithItsInstant) {
+  const DateTime instant = DateTime::Parse("2024-03-05T07:08:09.010Z");
+  EXPECT_EQ(Describe(Delegate{{"bob", "CORP"}, instant}),
+            "{Name: bob; Domain:CORP} at 2024-03-05T07:08:09.010Z");
+}
+
+TEST(Describe, JoinsAttributeValuesByPosition) {
+  EXPECT_EQ(Describe(AdviceAttribute{"N", {}}), "[source=N, attributes=[]]");
+  EXPECT_EQ(Describe(AdviceAttribute{"N", {"a"}}), "[source=N, attributes=[a]]");
+  EXPECT_EQ(Describe(AdviceAttribute{"N", {"x", ""}}), "[source=N, attributes=[x, ]]");
+  EXPECT_EQ(Describe(AdviceAttribute{"N", {"", "x"}}), "[source=N, attributes=[, x]]");
+  EXPECT_EQ(Describe(AdviceAttribute{"N", {"", ""}}), "[source=N, attributes=[, ]]");
+}
+
+TEST(Describe, WritesAdviceWithItsAttributes) {
+  EXPECT_EQ(Describe(Advice{"S", {{"N", {"a", "b"}}}}),
+            "Advice [source=S, attributes=[[source=N, attributes=[a, b]]]]");
+  EXPECT_EQ(Describe(Advice{"S", {}}), "Advice [source=S, attributes=[]]");
+  EXPECT_EQ(Describe(Advice{"S", {{"N", {}}, {"M", {"c"}}}}),
+            "Advice [source=S, attributes=[[source=N, attributes=[]], [source=M, "
+            "attributes=[c]]]]");
+}
+
+TEST(Describe, WritesSpecWithoutOptionalParts) {
+  EXPECT_EQ(Describe(TokenSpec{}),
+            "TokenSpec [tokenLifetimeSec=0, delegable=false, delegateTo=<unset>, renewable=false, "
+            "confirmationType=0,audienceRestriction=, advice=[]");
+}
+
+TEST(Describe, WritesSpecWithAllParts) {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = INT64_MIN;
+  spec.audienceRestriction = {"urn:b", "urn:a"};
+  spec.advice = {{"S", {}}, {"T", {}}};
+  spec.delegable = true;
+  spec.delegateTo = std::string("bob@CORP");
+  spec.renewable = true;
+  spec.confirmation = CONFIRMATION_BEARER;
+  EXPECT_EQ(Describe(spec),
+            "TokenSpec [tokenLifetimeSec=-9223372036854775808, delegable=true, "
+            "delegateTo=bob@CORP, renewable=true, confirmationType=1,audienceRestriction=urn:a, "
+            "urn:b, advice=[Advice [source=S, attributes=[]], Advice [source=T, attributes=[]]]");
+}
+
+TEST(Describe, TellsAnEmptyDelegateFromNone) {
+  TokenSpec spec;
+  spec.delegateTo = std::string();
+  EXPECT_EQ(Describe(spec),
+            "TokenSpec [tokenLifetimeSec=0, delegable=false, delegateTo=, renewable=false, "
+            "confirmationType=0,audienceRestriction=, advice=[]");
+}
+
+TEST(Describe, KeepsTheSeparatorOfAnEmptyAudience) {
+  TokenSpec spec;
+  spec.audienceRestriction = {"", "urn:a"};
+  EXPECT_EQ(Describe(spec),
+            "TokenSpec [tokenLifetimeSec=0, delegable=false, delegateTo=<unset>, renewable=false, "
+            "confirmationType=0,audienceRestriction=, urn:a, advice=[]");
+}
+
+TEST(CreateSamlTokenDescription, WritesTokenWithoutGroupsAndDelegates) {
+  EXPECT_EQ(CreateSamlTokenDescription(FakeToken()),
+            "SamlToken [subject={Name: alice; Domain:CORP}, groups=[], delegationChain=[], "
+            "startTime=2024-03-05 07:08:09.010 UTC, expirationTime=2024-03-05 08:08:09.000 UTC, "
+            "renewable=false, delegable=false, isSolution=false,confirmationType=0]");
+}
+
+TEST(CreateSamlTokenDescription, WritesTokenWithAllParts) {
+  FakeToken token;
+  token.renewable = true;
+  token.delegable = true;
+  token.solution = true;
+  token.confirmation = HOLDER_OF_KEY;
+  token.groups = {{"staff", "CORP"}, {"admins", "CORP"}};
+  token.chain = {{{"first", "CORP"}, DateTime::Parse("2024-03-05T07:00:00Z")},
+                 {{"second", "CORP"}, DateTime::Parse("2024-03-05T07:00:01.000002Z")}};
+  EXPECT_EQ(CreateSamlTokenDescription(token),
+            "SamlToken [subject={Name: alice; Domain:CORP}, groups=[{Name: staff; Domain:CORP}, "
+            "{Name: admins; Domain:CORP}], delegationChain=[{Name: first; Domain:CORP} at "
+            "2024-03-05T07:00:00.000Z, {Name: second; Domain:CORP} at "
+            "2024-03-05T07:00:01.000002Z], startTime=2024-03-05 07:08:09.010 UTC, "
+            "expirationTime=2024-03-05 08:08:09.000 UTC, renewable=true, delegable=true, "
+            "isSolution=true,confirmationType=1]");
+}
+
+TEST(CreateSamlTokenDescription, AsksForEachValueOnce) {
+  const FakeToken token;
+  CreateSamlTokenDescription(token);
+  EXPECT_EQ(token.startTime, 1);
+  EXPECT_EQ(token.expirationTime, 1);
+  EXPECT_EQ(token.subjects, 1);
+  EXPECT_EQ(token.renewables, 1);
+  EXPECT_EQ(token.delegables, 1);
+  EXPECT_EQ(token.solutions, 1);
+  EXPECT_EQ(token.confirmations, 1);
+  EXPECT_EQ(token.groupLists, 1);
+  EXPECT_EQ(token.chains, 1);
+}
+
+TEST(CreateSamlTokenDescription, NeverTellsTheXml) {
+  EXPECT_EQ(CreateSamlTokenDescription(FakeToken()).find("SECRET"), std::string::npos);
+}
+
+}  // namespace
+}  // namespace SsoClient

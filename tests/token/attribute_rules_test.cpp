@@ -1,0 +1,188 @@
+#include "token/attribute_rules.h"
+
+#include <locale>
+
+#include <ssoclient/exceptions.h>
+
+#include "support/parsed_xml.h"
+#include "support/thrown_message.h"
+
+namespace SsoClient {
+namespace {
+
+using TestSupport::Fragment;
+using TestSupport::ThrownMessage;
+
+TEST(CheckAttributes, AcceptsRequiredOptionalAndNamespaceDeclarations) {
+  const Fragment fragment(R"(<saml2:A c="" b="" a="" xmlns="urn:x" xmlns:y="urn:y"/>)");
+  EXPECT_NO_THROW(CheckAttributes(fragment.Element(), {"a", "b"}, {"c", "d"}));
+}
+
+TEST(CheckAttributes, NamesTheFirstMissingOneInListOrder) {
+  const Fragment fragment(R"(<saml2:A b="" extra=""/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] {
+              CheckAttributes(fragment.Element(), {"b", "c", "a"});
+            }),
+            "Node 'saml2:A is missing required attribute 'c'");
+}
+
+TEST(CheckAttributes, RejectsWhatIsLeft) {
+  for (const char* content :
+       {R"(<saml2:A a="" b=""/>)", R"(<saml2:A a="" ds:a=""/>)", R"(<saml2:A a="" xmlnsx=""/>)",
+        R"(<saml2:A a="" xml:lang="en"/>)", R"(<saml2:A a="" xsi:type="xs:string"/>)"}) {
+    const Fragment fragment(content);
+    EXPECT_EQ(
+        ThrownMessage<ParseException>([&] { CheckAttributes(fragment.Element(), {"a"}, {"c"}); }),
+        "Unexpected attributes on element 'saml2:A'")
+        << content;
+  }
+}
+
+TEST(CheckAttributes, DoesNotTakeAPrefixedAttributeForTheRequiredOne) {
+  const Fragment fragment(R"(<saml2:A saml2:a=""/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CheckAttributes(fragment.Element(), {"a"}); }),
+            "Node 'saml2:A is missing required attribute 'a'");
+}
+
+TEST(CheckEachAttribute, FindsTypeUnderAnyPrefix) {
+  const Fragment fragment(
+      R"(<A s:type="x" Count="1" xmlns:s="http://www.w3.org/2001/XMLSchema-instance"/>)");
+  EXPECT_NO_THROW(CheckEachAttribute(fragment.Element(), {kTypeAttribute}, {{"", "Count"}}));
+  EXPECT_EQ(FindTypeAttribute(fragment.Element()), "x");
+}
+
+TEST(CheckEachAttribute, NamesTheMissingOne) {
+  const Fragment fragment(R"(<saml2:A type="x" extra=""/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>(
+                [&] { CheckEachAttribute(fragment.Element(), {kTypeAttribute}); }),
+            "Node 'saml2:A is missing required attribute 'xsi:type'");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] {
+              CheckEachAttribute(fragment.Element(), {{"", "Count"}});
+            }),
+            "Node 'saml2:A is missing required attribute 'Count'");
+}
+
+TEST(CheckEachAttribute, NamesTheOneTooMany) {
+  const Fragment type(R"(<saml2:A xsi:type="x" type="y"/>)");
+  EXPECT_EQ(
+      ThrownMessage<ParseException>([&] { CheckEachAttribute(type.Element(), {kTypeAttribute}); }),
+      "Unexpected attribute 'type' on element 'saml2:A'");
+  const Fragment nil(R"(<saml2:A xsi:nil="true"/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>(
+                [&] { CheckEachAttribute(nil.Element(), {}, {kTypeAttribute}); }),
+            "Unexpected attribute 'xsi:nil' on element 'saml2:A'");
+  const Fragment foreign(R"(<saml2:A Count="1" saml2:Count="2"/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] {
+              CheckEachAttribute(foreign.Element(), {{"", "Count"}});
+            }),
+            "Unexpected attribute 'saml2:Count' on element 'saml2:A'");
+}
+
+TEST(ReadAttribute, GivesTheValueOrNamesTheMissingOne) {
+  const Fragment fragment(R"(<saml2:A a="x &amp; y"/>)");
+  EXPECT_EQ(ReadAttribute(fragment.Element(), "a"), "x & y");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadAttribute(fragment.Element(), "b"); }),
+            "Node 'saml2:A is missing required attribute 'b'");
+}
+
+Fragment WithValue(const std::string& value) {
+  return Fragment("<saml2:A v=\"" + value + "\"/>");
+}
+
+struct DateCase {
+  std::string text;
+  std::string canonical;  // empty: refused
+};
+
+class ReadDateAttributeCase : public testing::TestWithParam<DateCase> {};
+
+TEST_P(ReadDateAttributeCase, ReadsOrRefuses) {
+  const Fragment fragment = WithValue(GetParam().text);
+  if (!GetParam().canonical.empty()) {
+    const auto time = ReadDateAttribute(fragment.Element(), "v");
+    EXPECT_EQ(Tarnik::System::DateTimeFromUtc(time.GetUtcTime(), false).ToString(),
+              GetParam().canonical);
+    return;
+  }
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadDateAttribute(fragment.Element(), "v"); }),
+            "saml2:A/@v is not a date");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Dates, ReadDateAttributeCase,
+    testing::Values(DateCase{"2024-03-05T07:08:09.010Z", "2024-03-05T07:08:09.010Z"},
+                    DateCase{"2024-03-05T07:08:09", "2024-03-05T07:08:09.000Z"},
+                    DateCase{"2024-03-05T24:00:00Z", "2024-03-06T00:00:00.000Z"},
+                    DateCase{"2024-03-05T07:08:09.1234567Z", "2024-03-05T07:08:09.123456Z"},
+                    DateCase{"2024-03-05T14:00:00+14:00", "2024-03-05T00:00:00.000Z"},
+                    DateCase{"2024-02-29T00:00:00Z", "2024-02-29T00:00:00.000Z"},
+                    DateCase{"2024-03-05T23:59:60Z", ""}, DateCase{"2024-03-05T24:00:01Z", ""},
+                    DateCase{"2024-03-05T07:08:09+14:01", ""}, DateCase{"2023-02-29T00:00:00Z", ""},
+                    DateCase{"0000-03-05T07:08:09Z", ""}, DateCase{"-0001-03-05T07:08:09Z", ""},
+                    DateCase{"10000-03-05T07:08:09Z", ""}, DateCase{"2024-03-05T07:08:09z", ""},
+                    DateCase{"2024-03-05t07:08:09Z", ""}, DateCase{" 2024-03-05T07:08:09Z", ""},
+                    DateCase{"2024-03-05T07:08:09Z ", ""}, DateCase{"2024-03-05", ""},
+                    DateCase{"soon", ""}, DateCase{"", ""}));
+
+TEST(ReadDateAttribute, NamesAMissingAttribute) {
+  const Fragment fragment = WithValue("x");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadDateAttribute(fragment.Element(), "w"); }),
+            "Node 'saml2:A is missing required attribute 'w'");
+}
+
+TEST(ReadCountAttribute, ReadsIntegersThatFit) {
+  const std::pair<const char*, std::uint32_t> cases[] = {
+      {"0", 0},   {"-0", 0},
+      {"+0", 0},  {"+1", 1},
+      {"007", 7}, {"4294967295", 4294967295U},
+      {"10", 10}, {"0000000000000000000000001", 1}};
+  for (const auto& [text, count] : cases) {
+    EXPECT_EQ(ReadCountAttribute(WithValue(text).Element(), "v"), count) << text;
+  }
+}
+
+TEST(ReadCountAttribute, RefusesWhatIsNoCount) {
+  for (const char* text : {"-1", "4294967296", "9223372036854775807", "9223372036854775808",
+                           "18446744073709551616", "-9223372036854775809", "1e3", "", " ", " 1",
+                           "1 ", "1.0", "0x10", "one", "+", "-", "+-1", "1,000", "\xD9\xA1"}) {
+    const Fragment fragment = WithValue(text);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadCountAttribute(fragment.Element(), "v"); }),
+              "saml2:A/@v is not a non-negative integer.")
+        << text;
+  }
+}
+
+// Groups digits as many locales do.
+class Grouping : public std::numpunct<char> {
+  char do_thousands_sep() const override { return ','; }
+  std::string do_grouping() const override { return "\3"; }
+};
+
+TEST(ReadCountAttribute, DoesNotFollowTheLocale) {
+  const std::locale before = std::locale::global(std::locale(std::locale(), new Grouping));
+  const Fragment fragment = WithValue("1,000");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadCountAttribute(fragment.Element(), "v"); }),
+            "saml2:A/@v is not a non-negative integer.");
+  std::locale::global(before);
+}
+
+TEST(ReadBooleanAttribute, ReadsBooleansInAnyLetterCase) {
+  for (const char* text : {"true", "TRUE", "True", "tRuE", "1"}) {
+    EXPECT_TRUE(ReadBooleanAttribute(WithValue(text).Element(), "v")) << text;
+  }
+  for (const char* text : {"false", "FALSE", "False", "0"}) {
+    EXPECT_FALSE(ReadBooleanAttribute(WithValue(text).Element(), "v")) << text;
+  }
+}
+
+TEST(ReadBooleanAttribute, RefusesAnythingElse) {
+  for (const char* text : {"yes", "no", "", " true", "true ", "01", "t", "-1"}) {
+    const Fragment fragment = WithValue(text);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadBooleanAttribute(fragment.Element(), "v"); }),
+              "saml2:A/@v is not a Boolean")
+        << text;
+  }
+}
+
+}  // namespace
+}  // namespace SsoClient

@@ -1,0 +1,225 @@
+#include "token/subject_reader.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarnik/crypto/crypto_exception.h>
+
+#include "support/assertion_text.h"
+#include "support/parsed_xml.h"
+#include "support/thrown_message.h"
+
+namespace SsoClient {
+namespace {
+
+using TestSupport::AssertionText;
+using TestSupport::CertificateBody;
+using TestSupport::Fragment;
+using TestSupport::InsertedBehind;
+using TestSupport::Replaced;
+using TestSupport::ThrownMessage;
+using TestSupport::TrustedCredential;
+
+const Tarnik::System::DateTime kNow = Tarnik::System::DateTime::Parse("2024-03-05T07:00:00Z");
+
+std::string BearerText() {
+  return AssertionText(kNow).subject;
+}
+
+std::string HolderOfKeyText() {
+  return AssertionText(kNow).ConfirmByKey(TrustedCredential().certificatePem).subject;
+}
+
+ParsedSubject Read(const std::string& text) {
+  Fragment fragment(text);
+  ParsedSubject subject = ReadSubject(fragment.Cursor());
+  EXPECT_TRUE(fragment.Cursor().IsAtEnd());
+  return subject;
+}
+
+std::string Refusal(const std::string& text) {
+  return ThrownMessage<ParseException>([&] { Read(text); });
+}
+
+TEST(ReadSubject, ReadsABearerSubject) {
+  const ParsedSubject subject = Read(BearerText());
+  EXPECT_EQ(subject.principal.name, "alice");
+  EXPECT_EQ(subject.principal.domain, "example.com");
+  EXPECT_EQ(subject.confirmationMethod, BEARER);
+  EXPECT_FALSE(subject.delegateId.has_value());
+  EXPECT_EQ(subject.notOnOrAfter.ToString(), "2024-03-05T08:00:00.000Z");
+  EXPECT_EQ(subject.holderOfKeyCertificate, nullptr);
+}
+
+TEST(ReadSubject, ReadsAHolderOfKeySubject) {
+  const ParsedSubject subject = Read(HolderOfKeyText());
+  EXPECT_EQ(subject.confirmationMethod, HOLDER_OF_KEY);
+  EXPECT_EQ(subject.notOnOrAfter.ToString(), "2024-03-05T08:00:00.000Z");
+  ASSERT_NE(subject.holderOfKeyCertificate, nullptr);
+  const auto expected =
+      Tarnik::Crypto::CreateCertificatesFromPem(TrustedCredential().certificatePem).front();
+  EXPECT_EQ(subject.holderOfKeyCertificate->SerialNumber(), expected->SerialNumber());
+}
+
+TEST(ReadSubject, ReadsTheDelegateId) {
+  const ParsedSubject subject = Read(AssertionText(kNow).Delegate().subject);
+  ASSERT_TRUE(subject.delegateId.has_value());
+  EXPECT_EQ(subject.delegateId->name, "second");
+  EXPECT_EQ(subject.delegateId->domain, "example.com");
+}
+
+TEST(ReadSubject, SkipsWhiteSpaceAndComments) {
+  std::string text = HolderOfKeyText();
+  for (const char* tag : {"<saml2:NameID ", "<saml2:SubjectConfirmation ", "<ds:KeyInfo>",
+                          "<ds:X509Data>", "<ds:X509Certificate>", "</ds:X509Data>"}) {
+    text = Replaced(text, tag, std::string("\n <!--c-->\t").append(tag));
+  }
+  EXPECT_EQ(Read(text).principal.name, "alice");
+}
+
+TEST(ReadSubject, ReadsTheTypeByItsExpandedName) {
+  const std::string type = R"(xsi:type="saml2:KeyInfoConfirmationDataType")";
+  EXPECT_EQ(Read(Replaced(HolderOfKeyText(), type,
+                          R"(xsi:type="KeyInfoConfirmationDataType" )"
+                          R"(xmlns="urn:oasis:names:tc:SAML:2.0:assertion")"))
+                .confirmationMethod,
+            HOLDER_OF_KEY);
+  EXPECT_EQ(Read(Replaced(HolderOfKeyText(), type,
+                          R"(i:type="s:KeyInfoConfirmationDataType" )"
+                          R"(xmlns:s="urn:oasis:names:tc:SAML:2.0:assertion" )"
+                          R"(xmlns:i="http://www.w3.org/2001/XMLSchema-instance")"))
+                .confirmationMethod,
+            HOLDER_OF_KEY);
+}
+
+TEST(ReadSubject, RefusesOtherTypesOfHolderOfKeyData) {
+  for (const std::string type :
+       {"saml2:SubjectConfirmationDataType", "ds:KeyInfoConfirmationDataType",
+        "KeyInfoConfirmationDataType", "", "saml2:KeyInfoConfirmationDataType "}) {
+    EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), "saml2:KeyInfoConfirmationDataType", type)),
+              "Invalid SubjectConfirmationData type: '" + type + "'");
+  }
+  EXPECT_EQ(
+      Refusal(Replaced(HolderOfKeyText(), R"(xsi:type="saml2:KeyInfoConfirmationDataType")", "")),
+      "Node 'saml2:SubjectConfirmationData is missing required attribute 'xsi:type'");
+  EXPECT_EQ(
+      Refusal(Replaced(HolderOfKeyText(), "\"saml2:Key", "\"unbound:Key")),
+      "Element saml2:SubjectConfirmationDataat 1," +
+          std::to_string(("<root " + TestSupport::NamespaceDeclarations() + ">" + HolderOfKeyText())
+                             .find("<saml2:SubjectConfirmationData") +
+                         1) +
+          " uses undefined prefix: `unbound'");
+}
+
+TEST(ReadSubject, RefusesUnknownMethods) {
+  for (const std::string method :
+       {"urn:oasis:names:tc:SAML:2.0:cm:sender-vouches", "",
+        "urn:oasis:names:tc:SAML:2.0:cm:BEARER", "urn:oasis:names:tc:SAML:2.0:cm:bearer "}) {
+    EXPECT_EQ(Refusal(Replaced(BearerText(), "urn:oasis:names:tc:SAML:2.0:cm:bearer", method)),
+              "Unknown subject confirmation method: '" + method + "'");
+  }
+}
+
+TEST(ReadSubject, RefusesWhatStandsBehindAnExpectedChild) {
+  const std::pair<const char*, const char*> cases[] = {
+      {"</ds:X509Certificate>", "Unexpected elements after X509Certificate"},
+      {"</ds:X509Data>", "Unexpected elements after X509Data"},
+      {"</ds:KeyInfo>", "Unexpected elements after SubjectConfirmationData/KeyInfo"},
+      {"</saml2:SubjectConfirmationData>", "Unexpected elements after SubjectConfirmationData"},
+      {"</saml2:SubjectConfirmation>", "Unexpected elements after SubjectConfirmation"}};
+  for (const auto& [anchor, message] : cases) {
+    for (const char* addition : {"<x/>", "text", "<?pi?>"}) {
+      EXPECT_EQ(Refusal(InsertedBehind(HolderOfKeyText(), anchor, addition)), message);
+    }
+  }
+}
+
+TEST(ReadSubject, NamesTheInnermostFaultFirst) {
+  std::string text = HolderOfKeyText();
+  for (const char* anchor : {"</ds:X509Certificate>", "</ds:X509Data>", "</ds:KeyInfo>",
+                             "</saml2:SubjectConfirmationData>", "</saml2:SubjectConfirmation>"}) {
+    text = InsertedBehind(text, anchor, "<x/>");
+  }
+  EXPECT_EQ(Refusal(text), "Unexpected elements after X509Certificate");
+}
+
+TEST(ReadSubject, RefusesASecondCertificateOrConfirmation) {
+  EXPECT_EQ(Refusal(InsertedBehind(HolderOfKeyText(), "</ds:X509Certificate>",
+                                   "<ds:X509Certificate>AA==</ds:X509Certificate>")),
+            "Unexpected elements after X509Certificate");
+  const std::string confirmation = BearerText().substr(
+      BearerText().find("<saml2:SubjectConfirmation "),
+      BearerText().find("</saml2:Subject>") - BearerText().find("<saml2:SubjectConfirmation "));
+  EXPECT_EQ(Refusal(InsertedBehind(BearerText(), "</saml2:SubjectConfirmation>", confirmation)),
+            "Unexpected elements after SubjectConfirmation");
+}
+
+TEST(ReadSubject, RefusesMissingParts) {
+  EXPECT_EQ(Refusal("<saml2:Subject/>"), "Expected element 'NameID' not found.");
+  EXPECT_EQ(Refusal(Replaced(BearerText(), "</saml2:NameID>", "</saml2:NameID><x/>")),
+            "Expected element 'SubjectConfirmation' not found.");
+  EXPECT_EQ(
+      Refusal(Replaced(BearerText(), R"( Method="urn:oasis:names:tc:SAML:2.0:cm:bearer")", "")),
+      "Node 'saml2:SubjectConfirmation is missing required attribute 'Method'");
+  EXPECT_EQ(Refusal(Replaced(BearerText(), " NotOnOrAfter=\"2024-03-05T08:00:00.000Z\"", "")),
+            "Node 'saml2:SubjectConfirmationData is missing required attribute 'NotOnOrAfter'");
+  EXPECT_EQ(Refusal(Replaced(BearerText(), "2024-03-05T08:00:00.000Z", "later")),
+            "saml2:SubjectConfirmationData/@NotOnOrAfter is not a date");
+  EXPECT_EQ(Refusal(Replaced(BearerText(),
+                             "<saml2:SubjectConfirmationData "
+                             "NotOnOrAfter=\"2024-03-05T08:00:00.000Z\"/>",
+                             "")),
+            "Expected element 'SubjectConfirmationData' not found.");
+}
+
+TEST(ReadSubject, RefusesMissingKeyMaterial) {
+  const std::string certificate = "<ds:X509Certificate>" +
+                                  CertificateBody(TrustedCredential().certificatePem) +
+                                  "</ds:X509Certificate>";
+  const std::string data = "<ds:X509Data>" + certificate + "</ds:X509Data>";
+  EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), certificate, "")),
+            "Expected element 'X509Certificate' not found.");
+  EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), data, "")),
+            "Expected element 'X509Data' not found.");
+  EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), "<ds:KeyInfo>" + data + "</ds:KeyInfo>", "")),
+            "Expected element 'KeyInfo' not found.");
+  EXPECT_EQ(Refusal(Replaced(Replaced(HolderOfKeyText(), "<ds:X509Data>", "<saml2:X509Data>"),
+                             "</ds:X509Data>", "</saml2:X509Data>")),
+            "Element 'saml2:X509Data' has unexpected namespace");
+}
+
+TEST(ReadSubject, PassesThePlatformsFaultsOfACertificate) {
+  const std::string body = CertificateBody(TrustedCredential().certificatePem);
+  EXPECT_THROW(Read(Replaced(HolderOfKeyText(), body, "not base64!")),
+               Tarnik::Base64FormatException);
+  EXPECT_THROW(Read(Replaced(HolderOfKeyText(), body, "AAECAwQF")),
+               Tarnik::Crypto::CryptoException);
+}
+
+TEST(ReadSubject, RefusesBearerDataThatSaysMore) {
+  const std::string end = "Z\"/>";
+  EXPECT_EQ(Refusal(Replaced(BearerText(), end, "Z\" Recipient=\"urn:r\"/>")),
+            "Unexpected attribute 'Recipient' on element 'saml2:SubjectConfirmationData'");
+  EXPECT_EQ(
+      Refusal(Replaced(BearerText(), end, "Z\" xsi:type=\"saml2:KeyInfoConfirmationDataType\"/>")),
+      "Unexpected attribute 'xsi:type' on element 'saml2:SubjectConfirmationData'");
+  EXPECT_EQ(
+      Refusal(Replaced(BearerText(), end, "Z\"><ds:KeyInfo/></saml2:SubjectConfirmationData>")),
+      "Element 'saml2:SubjectConfirmationData' must be empty");
+}
+
+TEST(ReadSubject, RefusesUnexpectedAttributes) {
+  const std::pair<const char*, const char*> cases[] = {
+      {"<saml2:Subject", "saml2:Subject"},
+      {"<ds:KeyInfo", "ds:KeyInfo"},
+      {"<ds:X509Data", "ds:X509Data"},
+      {"<ds:X509Certificate", "ds:X509Certificate"}};
+  for (const auto& [tag, name] : cases) {
+    const std::string open = std::string(tag) + ">";
+    EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), open, std::string(tag) + " Id=\"i\">")),
+              std::string("Unexpected attributes on element '") + name + "'");
+  }
+  EXPECT_EQ(Refusal(Replaced(BearerText(), " Method=", " Id=\"i\" Method=")),
+            "Unexpected attributes on element 'saml2:SubjectConfirmation'");
+}
+
+}  // namespace
+}  // namespace SsoClient
