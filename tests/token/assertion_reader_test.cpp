@@ -1,0 +1,219 @@
+#include "token/assertion_reader.h"
+
+#include <ssoclient/exceptions.h>
+
+#include "support/assertion_text.h"
+#include "support/parsed_xml.h"
+#include "support/thrown_message.h"
+
+namespace SsoClient {
+namespace {
+
+using TestSupport::AssertionText;
+using TestSupport::MadeUpSignature;
+using TestSupport::ParseXml;
+using TestSupport::Replaced;
+using TestSupport::ThrownMessage;
+
+const Tarnik::System::DateTime kNow = Tarnik::System::DateTime::Parse("2024-03-05T07:01:00Z");
+
+ParsedAssertion Read(const std::string& xml) {
+  return ReadAssertion(ParseXml(xml)->RootElement());
+}
+
+std::string Refusal(const std::string& xml) {
+  return ThrownMessage<ParseException>([&] { Read(xml); });
+}
+
+void ExpectAllValues(const ParsedAssertion& parsed) {
+  EXPECT_EQ(parsed.version, "2.0");
+  EXPECT_EQ(parsed.id, "_a1");
+  EXPECT_EQ(parsed.issueInstant.ToString(), "2024-03-05T07:00:00.000Z");
+  EXPECT_EQ(parsed.issuer.value, "https://sts.example.com/STS");
+  EXPECT_EQ(parsed.issuer.format, "urn:oasis:names:tc:SAML:2.0:nameid-format:entity");
+  ASSERT_NE(parsed.signature, nullptr);
+  EXPECT_EQ(parsed.signature->References().front().uri, "#_a1");
+  EXPECT_EQ(parsed.subject.principal.name, "alice");
+  EXPECT_EQ(parsed.conditions.notOnOrAfter.ToString(), "2024-03-05T08:01:00.000Z");
+  ASSERT_EQ(parsed.advice.size(), 1U);
+  EXPECT_EQ(parsed.advice.front().source, "urn:source");
+  ASSERT_TRUE(parsed.authnStatement.has_value());
+  EXPECT_EQ(parsed.authnStatement->instant.ToString(), "2024-03-05T07:00:00.000Z");
+  EXPECT_EQ(parsed.authnStatement->contextClass,
+            "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport");
+  ASSERT_EQ(parsed.attributes.groups.size(), 2U);
+  EXPECT_EQ(parsed.attributes.groups.front().name, "staff");
+  EXPECT_EQ(parsed.attributes.names.surname, "Archer");
+}
+
+TEST(ReadAssertion, ReadsEveryPart) {
+  ExpectAllValues(Read(AssertionText(kNow).ToXml()));
+}
+
+TEST(ReadAssertion, SkipsBlankLinesTabsAndCommentsBetweenParts) {
+  AssertionText text(kNow);
+  for (std::string* part : {&text.issuer, &text.signature, &text.subject, &text.conditions,
+                            &text.advice, &text.authnStatement, &text.attributeStatement}) {
+    part->insert(0, "\n\n\t <!-- comment -->&#13;\n");
+  }
+  text.tail = "\n<!---->\n";
+  ExpectAllValues(Read(text.ToXml()));
+}
+
+TEST(ReadAssertion, ReadsAnyPrefixAndTheDefaultNamespace) {
+  std::string xml = AssertionText(kNow).ToXml();
+  const auto replaceAll = [&](std::string_view from, std::string_view to) {
+    for (std::size_t at = 0; (at = xml.find(from, at)) != std::string::npos; at += to.size()) {
+      xml.replace(at, from.size(), to);
+    }
+  };
+  replaceAll("<saml2:", "<");
+  replaceAll("</saml2:", "</");
+  replaceAll("xmlns:saml2=", "xmlns=");
+  ExpectAllValues(Read(xml));
+}
+
+TEST(ReadAssertion, LetsAdviceAndStatementsBeAbsent) {
+  for (int present = 0; present < 8; ++present) {
+    AssertionText text(kNow);
+    if ((present & 1) == 0) {
+      text.advice.clear();
+    }
+    if ((present & 2) == 0) {
+      text.authnStatement.clear();
+    }
+    if ((present & 4) == 0) {
+      text.attributeStatement.clear();
+    }
+    const ParsedAssertion parsed = Read(text.ToXml());
+    EXPECT_EQ(parsed.advice.empty(), (present & 1) == 0);
+    EXPECT_EQ(parsed.authnStatement.has_value(), (present & 2) != 0);
+    EXPECT_EQ(parsed.attributes.groups.empty(), (present & 4) == 0);
+  }
+}
+
+TEST(ReadAssertion, RefusesANonBlankCharacterBetweenParts) {
+  const std::pair<std::string AssertionText::*, const char*> cases[] = {
+      {&AssertionText::issuer, "Expected element 'Issuer' not found."},
+      {&AssertionText::signature, "Expected element ds:Signature not found"},
+      {&AssertionText::subject, "Expected element 'Subject' not found."},
+      {&AssertionText::conditions, "Expected element 'Conditions' not found."},
+      {&AssertionText::advice, "Unexpected elements under Assertion"},
+      {&AssertionText::authnStatement, "Unexpected elements under Assertion"},
+      {&AssertionText::attributeStatement, "Unexpected elements under Assertion"},
+      {&AssertionText::tail, "Unexpected elements under Assertion"}};
+  for (const auto& [part, message] : cases) {
+    for (const char* intruder : {".", "\xC2\xA0", "<?pi?>"}) {
+      AssertionText text(kNow);
+      (text.*part).insert(0, intruder);
+      EXPECT_EQ(Refusal(text.ToXml()), message);
+    }
+  }
+}
+
+TEST(ReadAssertion, RefusesMissingRequiredParts) {
+  const std::pair<std::string AssertionText::*, const char*> cases[] = {
+      {&AssertionText::issuer, "Expected element 'Issuer' not found."},
+      {&AssertionText::subject, "Expected element 'Subject' not found."},
+      {&AssertionText::conditions, "Expected element 'Conditions' not found."}};
+  for (const auto& [part, message] : cases) {
+    AssertionText text(kNow);
+    (text.*part).clear();
+    EXPECT_EQ(Refusal(text.ToXml()), message);
+  }
+  EXPECT_EQ(Refusal("<saml2:Assertion " + TestSupport::NamespaceDeclarations() + " " +
+                    AssertionText(kNow).attributes + ">" + AssertionText(kNow).issuer +
+                    "</saml2:Assertion>"),
+            "Expected element ds:Signature not found");
+}
+
+TEST(ReadAssertion, RefusesElementsBehindTheLastStatement) {
+  for (const char* tail : {"<saml2:AttributeStatement/>", "<saml2:AuthzDecisionStatement/>", "<x/>",
+                           "<saml2:Issuer>i</saml2:Issuer>"}) {
+    AssertionText text(kNow);
+    text.tail = tail;
+    EXPECT_EQ(Refusal(text.ToXml()), "Unexpected elements under Assertion");
+  }
+  AssertionText second(kNow);
+  second.tail = second.signature;
+  EXPECT_EQ(Refusal(second.ToXml()), "Unexpected elements under Assertion");
+}
+
+TEST(ReadAssertion, RefusesAnotherOrder) {
+  AssertionText statements(kNow);
+  std::swap(statements.authnStatement, statements.attributeStatement);
+  EXPECT_EQ(Refusal(statements.ToXml()), "Unexpected elements under Assertion");
+  AssertionText advice(kNow);
+  std::swap(advice.advice, advice.authnStatement);
+  EXPECT_EQ(Refusal(advice.ToXml()), "Unexpected elements under Assertion");
+  AssertionText subject(kNow);
+  std::swap(subject.subject, subject.conditions);
+  EXPECT_EQ(Refusal(subject.ToXml()), "Expected element 'Subject' not found.");
+  AssertionText signature(kNow);
+  std::swap(signature.issuer, signature.signature);
+  EXPECT_EQ(Refusal(signature.ToXml()), "Expected element 'Issuer' not found.");
+}
+
+TEST(ReadAssertion, RefusesStatementsOfAnotherNamespaceByName) {
+  for (const char* name : {"Advice", "AuthnStatement", "AttributeStatement"}) {
+    AssertionText text(kNow);
+    text.advice.clear();
+    text.authnStatement.clear();
+    text.attributeStatement = std::string("<x:") + name + " xmlns:x=\"urn:x\"/>";
+    EXPECT_EQ(Refusal(text.ToXml()),
+              std::string("Element 'x:") + name + "' has unexpected namespace");
+  }
+}
+
+TEST(ReadAssertion, RefusesAnotherRoot) {
+  EXPECT_EQ(Refusal("<Response/>"), "Expected element 'Assertion' not found.");
+  EXPECT_EQ(Refusal("<Assertion/>"), "Element 'Assertion' has unexpected namespace");
+  EXPECT_EQ(Refusal(R"(<s:Assertion xmlns:s="urn:oasis:names:tc:SAML:1.0:assertion"/>)"),
+            "Element 's:Assertion' has unexpected namespace");
+  EXPECT_EQ(ThrownMessage<ParseException>([] { ReadAssertion(nullptr); }),
+            "Expected element 'Assertion' not found.");
+}
+
+TEST(ReadAssertion, AcceptsFurtherNamespaceDeclarations) {
+  AssertionText text(kNow);
+  text.attributes += R"( xmlns="urn:default" xmlns:other="urn:other")";
+  ExpectAllValues(Read(text.ToXml()));
+}
+
+TEST(ReadAssertion, RefusesFurtherAttributes) {
+  for (const char* attribute : {" x=\"\"", " xml:lang=\"en\"", " xml:id=\"_a1\"", " Id=\"_a1\"",
+                                " xsi:type=\"saml2:AssertionType\"", " saml2:ID=\"_a1\""}) {
+    AssertionText text(kNow);
+    text.attributes += attribute;
+    EXPECT_EQ(Refusal(text.ToXml()), "Unexpected attributes on element 'saml2:Assertion'");
+  }
+}
+
+TEST(ReadAssertion, RefusesMissingOrBrokenAttributes) {
+  const std::tuple<const char*, const char*, const char*> cases[] = {
+      {" Version=\"2.0\"", "", "Node 'saml2:Assertion is missing required attribute 'Version'"},
+      {"ID=\"_a1\" ", "", "Node 'saml2:Assertion is missing required attribute 'ID'"},
+      {"ID=\"_a1\" ", "id=\"_a1\" ", "Node 'saml2:Assertion is missing required attribute 'ID'"},
+      {" IssueInstant=\"2024-03-05T07:00:00.000Z\"", "",
+       "Node 'saml2:Assertion is missing required attribute 'IssueInstant'"},
+      {"2024-03-05T07:00:00.000Z", "yesterday", "saml2:Assertion/@IssueInstant is not a date"}};
+  for (const auto& [from, to, message] : cases) {
+    AssertionText text(kNow);
+    text.attributes = Replaced(text.attributes, from, to);
+    EXPECT_EQ(Refusal(text.ToXml()), message);
+  }
+}
+
+TEST(ReadAssertion, NamesTheFirstFaultInReadingOrder) {
+  AssertionText text(kNow);
+  text.subject = "<x/>";
+  text.conditions = "<y/>";
+  EXPECT_EQ(Refusal(text.ToXml()), "Expected element 'Subject' not found.");
+  text.signature = MadeUpSignature("#other");
+  EXPECT_EQ(Refusal(text.ToXml()), "Token's signature must cover the entire token");
+  text.attributes = "Version=\"2.0\"";
+  EXPECT_EQ(Refusal(text.ToXml()), "Node 'saml2:Assertion is missing required attribute 'ID'");
+}
+
+}  // namespace
+}  // namespace SsoClient

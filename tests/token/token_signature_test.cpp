@@ -1,0 +1,145 @@
+#include "token/token_signature.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/xml/security/xml_security_exception.h>
+
+#include <functional>
+
+#include "support/assertion_text.h"
+#include "support/parsed_xml.h"
+#include "support/thrown_message.h"
+
+namespace SsoClient {
+namespace {
+
+using Tarnik::Ref;
+using Tarnik::Xml::Security::KeyInfoResolver;
+using Tarnik::Xml::Security::Signature;
+using TestSupport::Fragment;
+using TestSupport::MadeUpSignature;
+using TestSupport::Replaced;
+using TestSupport::ThrownMessage;
+
+std::string Refusal(const std::string& content, const std::string& id = "_a1") {
+  Fragment fragment(content);
+  return ThrownMessage<ParseException>([&] { ReadSignature(fragment.Cursor(), id); });
+}
+
+void ExpectCovers(const std::string& content) {
+  Fragment fragment(content);
+  const Ref<Signature> signature = ReadSignature(fragment.Cursor(), "_a1");
+  EXPECT_EQ(signature->Element(), &fragment.Element());
+  EXPECT_TRUE(fragment.Cursor().IsAtEnd());
+}
+
+std::string WithSecondReference(const std::string& signature, const std::string& uri) {
+  const std::size_t begin = signature.find("<ds:Reference ");
+  const std::size_t end = signature.find("</ds:SignedInfo>");
+  const std::string second =
+      MadeUpSignature(uri).substr(begin, MadeUpSignature(uri).find("</ds:SignedInfo>") - begin);
+  return signature.substr(0, end) + second + signature.substr(end);
+}
+
+TEST(ReadSignature, AcceptsAReferenceToTheAssertionOrTheDocument) {
+  ExpectCovers(MadeUpSignature("#_a1"));
+  ExpectCovers(MadeUpSignature(""));
+}
+
+TEST(ReadSignature, AcceptsOneCoveringReferenceAmongSeveral) {
+  ExpectCovers(WithSecondReference(MadeUpSignature("#_a1"), "#other"));
+  ExpectCovers(WithSecondReference(MadeUpSignature("#other"), "#_a1"));
+}
+
+TEST(ReadSignature, RefusesReferencesToElsewhere) {
+  for (const char* uri : {"#other", "#", "_a1", "#_a", "#_a11", "##_a1", "#_A1", "#_a1 ", " #_a1",
+                          "#xpointer(id('_a1'))", "#xpointer(/)", "urn:x#_a1"}) {
+    EXPECT_EQ(Refusal(MadeUpSignature(uri)), "Token's signature must cover the entire token")
+        << uri;
+  }
+  EXPECT_EQ(Refusal(WithSecondReference(MadeUpSignature("#other"), "#another")),
+            "Token's signature must cover the entire token");
+}
+
+TEST(ReadSignature, RefusesAnythingButAnElementInItsPlace) {
+  for (const char* content : {"", "text", "<?pi?>", " <!--c--> "}) {
+    EXPECT_EQ(Refusal(content), "Expected element ds:Signature not found");
+  }
+}
+
+TEST(ReadSignature, TellsThePlatformsSyntaxFault) {
+  const std::string cases[] = {
+      "<saml2:Subject/>",
+      "<Signature/>",
+      "<ds:Signature/>",
+      Replaced(Replaced(MadeUpSignature("#_a1"), "<ds:SignatureValue>", ""),
+               "AAECAwQF</ds:SignatureValue>", ""),
+      Replaced(MadeUpSignature("#_a1"), "<ds:SignatureValue>AA", "<ds:SignatureValue>AA<!---->"),
+      Replaced(MadeUpSignature("#_a1"), "<ds:DigestValue>AA", "<ds:DigestValue>AA<!---->")};
+  for (const std::string& content : cases) {
+    const Fragment fragment(content);
+    const std::string fault = ThrownMessage<Tarnik::Xml::Security::SignatureSyntaxException>(
+        [&] { Tarnik::Xml::Security::CreateSignatureFromDom(&fragment.Element()); });
+    EXPECT_EQ(Refusal(content), "Signature syntax error: " + fault);
+  }
+}
+
+// A signature whose verdict the test gives.
+class FakeSignature final : public Signature, public Tarnik::ObjectImpl {
+ public:
+  explicit FakeSignature(std::function<bool(const KeyInfoResolver*)> verify)
+      : verify_(std::move(verify)) {}
+
+  const std::string& CanonicalizationMethod() const override { return text_; }
+  const std::string& SignatureMethod() const override { return text_; }
+  const std::vector<Tarnik::Xml::Security::Reference>& References() const override {
+    return references_;
+  }
+  const Tarnik::Xml::Security::KeyInfo& KeyInfo() const override { return keyInfo_; }
+  Tarnik::Xml::ElementNode* Element() const override { return nullptr; }
+  bool Verify(const KeyInfoResolver* resolver) const override { return verify_(resolver); }
+
+ private:
+  std::function<bool(const KeyInfoResolver*)> verify_;
+  std::string text_;
+  std::vector<Tarnik::Xml::Security::Reference> references_;
+  Tarnik::Xml::Security::KeyInfo keyInfo_;
+};
+
+TEST(VerifySignature, AcceptsATrueVerdictOfTheGivenResolver) {
+  const Ref<const KeyInfoResolver> resolver = TestSupport::TrustedResolver();
+  const KeyInfoResolver* seen = nullptr;
+  const auto signature = Tarnik::MakeRef<FakeSignature>([&](const KeyInfoResolver* given) {
+    seen = given;
+    return true;
+  });
+  EXPECT_NO_THROW(VerifySignature(*signature, resolver.get()));
+  EXPECT_EQ(seen, resolver.get());
+}
+
+TEST(VerifySignature, RefusesAFalseVerdict) {
+  const auto signature =
+      Tarnik::MakeRef<FakeSignature>([](const KeyInfoResolver*) { return false; });
+  EXPECT_EQ(ThrownMessage<InvalidSignatureException>([&] { VerifySignature(*signature, nullptr); }),
+            "Failed to verify signature: token might have been tampered with.");
+}
+
+TEST(VerifySignature, TellsThePlatformsFault) {
+  const auto signature = Tarnik::MakeRef<FakeSignature>([](const KeyInfoResolver*) -> bool {
+    throw Tarnik::Xml::Security::XmlSecurityException("no trusted key");
+  });
+  EXPECT_EQ(ThrownMessage<InvalidSignatureException>([&] { VerifySignature(*signature, nullptr); }),
+            "Signature verification error. no trusted key");
+}
+
+TEST(VerifySignature, PassesOtherFaults) {
+  const auto signature = Tarnik::MakeRef<FakeSignature>([](const KeyInfoResolver*) -> bool {
+    throw Tarnik::InvalidStateException("resolver broken");
+  });
+  EXPECT_EQ(
+      ThrownMessage<Tarnik::InvalidStateException>([&] { VerifySignature(*signature, nullptr); }),
+      "resolver broken");
+}
+
+}  // namespace
+}  // namespace SsoClient
