@@ -1,0 +1,32 @@
+#include "transport/exchange_outcome.h"
+
+#include <string>
+
+namespace SsoClient {
+
+namespace {
+
+bool IsAnswer(int statusCode) {
+  return statusCode == 500 || (statusCode >= 200 && statusCode <= 299);
+}
+
+}  // namespace
+
+ExchangeOutcome InterpretFailure(const Tarnik::Exception& error) {
+  return {nullptr, CommunicationException(error.Message())};
+}
+
+ExchangeOutcome InterpretResponse(const Tarnik::Http::ClientResponse& response) {
+  try {
+    const auto& status = response.Status();
+    if (!IsAnswer(status.code)) {
+      return {nullptr, CommunicationException("Server returned error: " +
+                                              std::to_string(status.code) + " " + status.reason)};
+    }
+    return {response.Body(), std::nullopt};
+  } catch (const Tarnik::Exception& error) {
+    return InterpretFailure(error);
+  }
+}
+
+}  // namespace SsoClient

@@ -1,0 +1,49 @@
+#ifndef SSOCLIENT_TRANSPORT_TRANSPORT_H
+#define SSOCLIENT_TRANSPORT_TRANSPORT_H
+
+#include <functional>
+#include <memory>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/http_user_agent.h>
+
+#include "transport/soap_request.h"
+
+namespace SsoClient {
+
+/// One exchange, or one negotiation of several. Used by one exchange at a time. Owned through a
+/// `std::shared_ptr` to the concrete class.
+class TransportSession {
+ public:
+  /// Receives null and a reader over the answer's body, or the `CommunicationException` and null.
+  /// Both are valid only during the call. Called once, on an I/O thread; must not block.
+  using Completion = std::function<void(const Tarnik::Exception*, Tarnik::Reader*)>;
+
+  /// Posts `request` and waits for the answer, whose body `reader` then reads. Throws
+  /// `CommunicationException` when the exchange fails or the answer's HTTP status is neither 2xx
+  /// nor 500; what making the request throws passes through.
+  virtual void SendRequest(const SoapRequest& request,
+                           Tarnik::Ref<Tarnik::Reader>& reader) const = 0;
+
+  /// Posts `request` and returns at once with a handle that can call the exchange off.
+  virtual void SendRequestAsync(const SoapRequest& request, const Completion& completion,
+                                Tarnik::Ref<Tarnik::Http::PendingRequestItem>& handle) const = 0;
+
+ protected:
+  ~TransportSession() = default;
+};
+
+/// Makes sessions; safe from many threads. Owned like a session.
+class Transport {
+ public:
+  virtual std::shared_ptr<TransportSession> CreateSession() const = 0;
+
+ protected:
+  ~Transport() = default;
+};
+
+}  // namespace SsoClient
+
+#endif

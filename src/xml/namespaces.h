@@ -1,0 +1,33 @@
+#ifndef SSOCLIENT_XML_NAMESPACES_H
+#define SSOCLIENT_XML_NAMESPACES_H
+
+// The namespaces of requests and answers.
+namespace SsoClient {
+
+/// WS-Trust 1.3 and the ActAs element of WS-Trust 1.4.
+inline constexpr char kWstNamespace[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
+inline constexpr char kWst14Namespace[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200802";
+
+/// Web Services Security: SOAP Message Security 1.0.
+inline constexpr char kWsseNamespace[] =
+    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
+inline constexpr char kWsuNamespace[] =
+    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
+
+/// WS-Addressing 1.0.
+inline constexpr char kWsaNamespace[] = "http://www.w3.org/2005/08/addressing";
+
+/// SOAP 1.1, section 4.
+inline constexpr char kSoapNamespace[] = "http://schemas.xmlsoap.org/soap/envelope/";
+
+inline constexpr char kXmlSchemaNamespace[] = "http://www.w3.org/2001/XMLSchema";
+inline constexpr char kXmlSchemaInstanceNamespace[] = "http://www.w3.org/2001/XMLSchema-instance";
+
+/// The SAML 2.0 assertion namespace, and the token type of SAML 2.0 assertions (Web Services
+/// Security SAML Token Profile 1.1 tells token types apart by other URIs; security token services
+/// of WS-Trust 1.3 use this one).
+inline constexpr char kSamlNamespace[] = "urn:oasis:names:tc:SAML:2.0:assertion";
+
+}  // namespace SsoClient
+
+#endif
