@@ -1,0 +1,51 @@
+#include <memory>
+#include <utility>
+
+#include <ssoclient/security_token_service.h>
+#include <tarnik/core/exception.h>
+
+#include "sts/request_builder_impl.h"
+#include "sts/response_handler_impl.h"
+#include "sts/security_token_service_impl.h"
+#include "transport/https_client.h"
+
+namespace SsoClient {
+
+namespace {
+
+constexpr unsigned long kTimeoutMicroseconds = 240'000'000;
+
+std::shared_ptr<SecurityTokenService> CreateService(
+    std::shared_ptr<const Transport> transport,
+    const std::shared_ptr<SamlTokenFactory>& tokenFactory) {
+  return std::make_shared<SecurityTokenServiceImpl>(
+      std::make_shared<RequestBuilderImpl>(), std::move(transport),
+      std::make_shared<ResponseHandlerImpl>(), tokenFactory);
+}
+
+void CheckTokenFactory(const std::shared_ptr<SamlTokenFactory>& tokenFactory) {
+  if (tokenFactory == nullptr) {
+    throw Tarnik::InvalidArgumentException("The token factory must not be null.");
+  }
+}
+
+}  // namespace
+
+std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
+    const SecurityTokenServiceConfig& config) {
+  CheckTokenFactory(config.tokenFactory);
+  return CreateService(
+      std::make_shared<HttpsClient>(config.url, config.sslContext, config.sslPeerName,
+                                    kTimeoutMicroseconds, config.flag),
+      config.tokenFactory);
+}
+
+std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
+    const SecurityTokenServiceConfigEx& config) {
+  CheckTokenFactory(config.tokenFactory);
+  return CreateService(
+      std::make_shared<HttpsClient>(config.userAgent.get(), config.url, kTimeoutMicroseconds),
+      config.tokenFactory);
+}
+
+}  // namespace SsoClient

@@ -1,0 +1,33 @@
+#ifndef SSOCLIENT_STS_LOGGER_H
+#define SSOCLIENT_STS_LOGGER_H
+
+#include <string_view>
+
+#include <tarnik/service/log.h>
+
+namespace SsoClient {
+
+/// The library's one logger, named "SsoClient".
+extern const Tarnik::Service::StaticLogger kLogger;
+
+/// The level of the lines that trace operations and requests.
+inline constexpr int kTraceLevel = 7;
+/// The level of the lines that tell of a success.
+inline constexpr int kSuccessLevel = 5;
+
+/// Logs that an operation starts, and when it is left, however it is left, that it ends.
+class OperationLog {
+ public:
+  /// `operation` must outlive this object.
+  explicit OperationLog(std::string_view operation);
+  ~OperationLog();
+  OperationLog(const OperationLog&) = delete;
+  OperationLog& operator=(const OperationLog&) = delete;
+
+ private:
+  std::string_view operation_;
+};
+
+}  // namespace SsoClient
+
+#endif

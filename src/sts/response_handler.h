@@ -1,0 +1,40 @@
+#ifndef SSOCLIENT_STS_RESPONSE_HANDLER_H
+#define SSOCLIENT_STS_RESPONSE_HANDLER_H
+
+#include <string>
+
+#include <tarnik/core/reader.h>
+
+#include "sts/negotiation_response.h"
+
+namespace SsoClient {
+
+/// Reads the answers of a security token service. Each operation parses straight from the reader,
+/// fills its output only on success, and throws
+///  - `SsoException` for an answer that is not well-formed, not of the expected form, or a fault
+///    that is none of those below;
+///  - `InvalidCredentialsException` and `PasswordExpiredException` for a fault that says so;
+///  - `ParseException` for a fault code whose prefix is not bound.
+///
+/// Elements are looked up by their local names alone, the first match in document order.
+class ResponseHandler {
+ public:
+  /// The canonical text of the assertion in the answer to an Issue request
+  /// (WS-Trust 1.3, section 4.4).
+  virtual void ParseIssueResponse(Tarnik::Reader* response, std::string& assertion) const = 0;
+  /// The verdict in the answer to a Validate request (WS-Trust 1.3, section 7).
+  virtual bool ParseValidateResponse(Tarnik::Reader* response) const = 0;
+  /// The canonical text of the assertion in the answer to a Renew request
+  /// (WS-Trust 1.3, section 5).
+  virtual void ParseRenewResponse(Tarnik::Reader* response, std::string& assertion) const = 0;
+  /// One leg of a negotiation (WS-Trust 1.3, section 8).
+  virtual void ParseNegotiationResponse(Tarnik::Reader* response,
+                                        NegotiationResponse& negotiation) const = 0;
+
+ protected:
+  ~ResponseHandler() = default;
+};
+
+}  // namespace SsoClient
+
+#endif

@@ -1,0 +1,40 @@
+#ifndef SSOCLIENT_STS_SECURITY_TOKEN_SERVICE_IMPL_H
+#define SSOCLIENT_STS_SECURITY_TOKEN_SERVICE_IMPL_H
+
+#include <memory>
+#include <string>
+
+#include <ssoclient/security_token_service.h>
+
+#include "sts/request_builder.h"
+#include "sts/response_handler.h"
+#include "transport/transport.h"
+
+namespace SsoClient {
+
+/// Asks a service through four parts, none of which may be null. Copies share the parts.
+class SecurityTokenServiceImpl final : public SecurityTokenService {
+ public:
+  SecurityTokenServiceImpl(std::shared_ptr<const RequestBuilder> requestBuilder,
+                           std::shared_ptr<const Transport> transport,
+                           std::shared_ptr<const ResponseHandler> responseHandler,
+                           std::shared_ptr<SamlTokenFactory> tokenFactory);
+
+  std::shared_ptr<const SamlToken> AcquireToken(const std::string& userName,
+                                                const std::string& password,
+                                                const TokenSpec& spec) const override;
+  void AcquireTokenAsync(const std::string& userName, const std::string& password,
+                         const TokenSpec& spec, TokenCallback callback) const override;
+
+ private:
+  std::shared_ptr<const SamlToken> MakeToken(const std::string& assertion) const;
+
+  std::shared_ptr<const RequestBuilder> requestBuilder_;
+  std::shared_ptr<const Transport> transport_;
+  std::shared_ptr<const ResponseHandler> responseHandler_;
+  std::shared_ptr<SamlTokenFactory> tokenFactory_;
+};
+
+}  // namespace SsoClient
+
+#endif

@@ -1,0 +1,74 @@
+#include "sts/soap_fault.h"
+
+#include <algorithm>
+#include <array>
+#include <string>
+#include <string_view>
+
+#include <ssoclient/exceptions.h>
+
+#include "sts/response_elements.h"
+#include "token/qname.h"
+#include "xml/namespaces.h"
+
+namespace SsoClient {
+
+namespace {
+
+struct FaultCode {
+  std::string_view namespaceUri;
+  std::string_view localName;
+
+  bool Matches(const QName& name) const {
+    return name.namespaceUri == namespaceUri && name.localName == localName;
+  }
+};
+
+constexpr FaultCode kFailedAuthentication = {kWstNamespace, "FailedAuthentication"};
+constexpr std::array kRejectedCredentials = {
+    kFailedAuthentication,
+    FaultCode{kWstNamespace, "InvalidSecurityToken"},
+    FaultCode{kWsseNamespace, "InvalidSecurityToken"},
+};
+
+constexpr std::string_view kPasswordExpired = "Password of the user logging on is expired";
+constexpr char kAuthenticationFailed[] = "Authentication failed";
+
+bool MeansRejectedCredentials(const QName& code) {
+  return std::any_of(kRejectedCredentials.begin(), kRejectedCredentials.end(),
+                     [&code](const FaultCode& known) { return known.Matches(code); });
+}
+
+[[noreturn]] void ThrowFault(const QName& code, std::string_view codeText,
+                             std::string_view faultString) {
+  if (!MeansRejectedCredentials(code)) {
+    throw SsoException("Unexpected SOAP fault: " + std::string(codeText) + "; request failed.");
+  }
+  if (kFailedAuthentication.Matches(code) && faultString.starts_with(kPasswordExpired)) {
+    throw PasswordExpiredException(std::string(kAuthenticationFailed) + ": " +
+                                   std::string(faultString));
+  }
+  if (faultString.empty()) {
+    throw InvalidCredentialsException(kAuthenticationFailed);
+  }
+  throw InvalidCredentialsException(std::string(kAuthenticationFailed) + ": " +
+                                    std::string(faultString));
+}
+
+}  // namespace
+
+void CheckSoapFault(const Tarnik::Xml::ElementNode& envelope) {
+  const auto* fault = FindDescendant(envelope, {"Body", "Fault"});
+  if (fault == nullptr) {
+    return;
+  }
+  const auto* faultCode = fault->FirstChildElement("faultcode");
+  const auto* codeText = FirstTextChild(faultCode);
+  if (codeText == nullptr) {
+    throw SsoException("Invalid SOAP response: missing faultcode.");
+  }
+  const QName code = ResolveQName(*faultCode, codeText->Text(), kSoapNamespace);
+  ThrowFault(code, codeText->Text(), ElementText(fault->FirstChildElement("faultstring")));
+}
+
+}  // namespace SsoClient

@@ -1,0 +1,16 @@
+#ifndef SSOCLIENT_STS_SOAP_FAULT_H
+#define SSOCLIENT_STS_SOAP_FAULT_H
+
+#include <tarnik/xml/element_node.h>
+
+namespace SsoClient {
+
+/// Returns quietly unless the envelope's body holds a fault (SOAP 1.1, section 4.4). Throws
+/// `PasswordExpiredException` or `InvalidCredentialsException` for the fault codes that mean so
+/// (WS-Trust 1.3, section 11; Web Services Security: SOAP Message Security 1.0, section 12),
+/// `SsoException` for any other, and `ParseException` for a code with an unbound prefix.
+void CheckSoapFault(const Tarnik::Xml::ElementNode& envelope);
+
+}  // namespace SsoClient
+
+#endif
