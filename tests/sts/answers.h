@@ -1,0 +1,55 @@
+#ifndef SSOCLIENT_TESTS_STS_ANSWERS_H
+#define SSOCLIENT_TESTS_STS_ANSWERS_H
+
+#include <string>
+
+namespace SsoClient::Testing {
+
+inline constexpr char kAssertionXml[] =
+    R"(<saml2:Assertion xmlns:saml2="urn:oasis:names:tc:SAML:2.0:assertion" ID="_1">)"
+    R"(<saml2:Issuer>sts</saml2:Issuer></saml2:Assertion>)";
+
+/// A SOAP 1.1 envelope around `body`, with the prefixes wst and wsse bound.
+inline std::string Envelope(const std::string& body) {
+  return R"(<S:Envelope xmlns:S="http://schemas.xmlsoap.org/soap/envelope/">)"
+         R"(<S:Header/><S:Body xmlns:wst="http://docs.oasis-open.org/ws-sx/ws-trust/200512")"
+         R"( xmlns:wsse="http://docs.oasis-open.org/wss/2004/01/)"
+         R"(oasis-200401-wss-wssecurity-secext-1.0.xsd">)" +
+         body + "</S:Body></S:Envelope>";
+}
+
+inline std::string Rstr(const std::string& content, const std::string& attributes = {}) {
+  return "<wst:RequestSecurityTokenResponse" + attributes + ">" + content +
+         "</wst:RequestSecurityTokenResponse>";
+}
+
+inline std::string Collection(const std::string& content) {
+  return "<wst:RequestSecurityTokenResponseCollection>" + content +
+         "</wst:RequestSecurityTokenResponseCollection>";
+}
+
+inline std::string Requested(const std::string& content) {
+  return "<wst:RequestedSecurityToken>" + content + "</wst:RequestedSecurityToken>";
+}
+
+inline std::string Fault(const std::string& content) {
+  return "<S:Fault>" + content + "</S:Fault>";
+}
+
+inline std::string Fault(const std::string& code, const std::string& text) {
+  return Fault("<faultcode>" + code + "</faultcode><faultstring>" + text + "</faultstring>");
+}
+
+/// What the canonical text of `kAssertionXml` is inside of `Envelope`: it keeps the declarations
+/// that it inherits.
+inline constexpr char kCanonicalAssertion[] =
+    R"(<saml2:Assertion xmlns:S="http://schemas.xmlsoap.org/soap/envelope/")"
+    R"( xmlns:saml2="urn:oasis:names:tc:SAML:2.0:assertion")"
+    R"( xmlns:wsse="http://docs.oasis-open.org/wss/2004/01/)"
+    R"(oasis-200401-wss-wssecurity-secext-1.0.xsd")"
+    R"( xmlns:wst="http://docs.oasis-open.org/ws-sx/ws-trust/200512" ID="_1">)"
+    R"(<saml2:Issuer>sts</saml2:Issuer></saml2:Assertion>)";
+
+}  // namespace SsoClient::Testing
+
+#endif

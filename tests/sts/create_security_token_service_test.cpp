@@ -1,0 +1,159 @@
+#include <gmock/gmock.h>
+#include <ssoclient/security_token_service.h>
+#include <tarnik/http/http_user_agent.h>
+
+#include <functional>
+#include <string>
+
+#include "sts/answers.h"
+#include "support/fake_saml_token.h"
+#include "transport/connection_specs.h"
+#include "transport/fake_http.h"
+#include "transport/fake_ssl.h"
+#include "transport/loopback_server.h"
+
+namespace SsoClient {
+namespace {
+
+using testing::HasSubstr;
+using testing::StartsWith;
+
+class AcceptingFactory final : public SamlTokenFactory {
+ public:
+  std::shared_ptr<const SamlToken> CreateToken(const std::string& xml) const override {
+    return CreateToken(xml, 600);
+  }
+  std::shared_ptr<const SamlToken> CreateToken(const std::string& xml, long) const override {
+    return std::make_shared<Testing::FakeSamlToken>(xml);
+  }
+  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
+    return nullptr;
+  }
+  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*, long) const override {
+    return nullptr;
+  }
+};
+
+std::string IssueAnswer() {
+  return Testing::Envelope(
+      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
+}
+
+TokenSpec OneHour() {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 3600;
+  return spec;
+}
+
+template <class Config>
+std::string ArgumentError(const Config& config) {
+  try {
+    CreateSecurityTokenService(config);
+  } catch (const Tarnik::InvalidArgumentException& error) {
+    return error.Message();
+  }
+  return "none";
+}
+
+class CreateSecurityTokenServiceTest : public testing::Test {
+ protected:
+  CreateSecurityTokenServiceTest() {
+    config_.url = server_.Url("/sts/STSService");
+    config_.tokenFactory = std::make_shared<AcceptingFactory>();
+  }
+
+  Testing::LoopbackServer server_{
+      [](const std::string&) { return Testing::OkAnswer(IssueAnswer()); }};
+  SecurityTokenServiceConfig config_;
+};
+
+TEST_F(CreateSecurityTokenServiceTest, AcquiresATokenOverHttp) {
+  const auto token = CreateSecurityTokenService(config_)->AcquireToken("alice", "pw", OneHour());
+  ASSERT_NE(token, nullptr);
+  EXPECT_EQ(token->Xml(), Testing::kCanonicalAssertion);
+  ASSERT_EQ(server_.Requests().size(), 1U);
+  const auto request = server_.Requests()[0];
+  EXPECT_THAT(request, StartsWith("POST /sts/STSService HTTP/1.1\r\n"));
+  EXPECT_THAT(request,
+              HasSubstr("\r\nSOAPAction: "
+                        "\"http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue\"\r\n"));
+  EXPECT_THAT(request, HasSubstr("<wsse:Username>alice</wsse:Username>"));
+}
+
+TEST_F(CreateSecurityTokenServiceTest, TheFlagChangesNothing) {
+  config_.flag = true;
+  EXPECT_NE(CreateSecurityTokenService(config_)->AcquireToken("alice", "pw", OneHour()), nullptr);
+}
+
+TEST_F(CreateSecurityTokenServiceTest, ReadsTheConfigurationOnce) {
+  const auto service = CreateSecurityTokenService(config_);
+  config_ = {};
+  EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
+}
+
+TEST_F(CreateSecurityTokenServiceTest, HttpsNeedsAnSslContext) {
+  config_.url = "https://127.0.0.1:" + std::to_string(server_.Port()) + "/";
+  EXPECT_EQ(ArgumentError(config_), "HTTPS connection requested but no SSLContext provided.");
+}
+
+TEST_F(CreateSecurityTokenServiceTest, HandsTheTlsValuesOn) {
+  const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
+  config_.url = "https://127.0.0.1:" + std::to_string(server_.Port()) + "/";
+  config_.sslContext = context.get();
+  config_.sslPeerName = "sts.example";
+  EXPECT_NE(CreateSecurityTokenService(config_)->AcquireToken("alice", "pw", OneHour()), nullptr);
+  EXPECT_EQ(context->serverName, "sts.example");
+  EXPECT_EQ(context->host, "127.0.0.1");
+}
+
+TEST_F(CreateSecurityTokenServiceTest, MalformedUrlsAreRefused) {
+  config_.url = "nowhere";
+  EXPECT_NE(ArgumentError(config_), "none");
+}
+
+TEST_F(CreateSecurityTokenServiceTest, ATokenFactoryIsNeeded) {
+  config_.tokenFactory = nullptr;
+  EXPECT_EQ(ArgumentError(config_), "The token factory must not be null.");
+}
+
+class CreateSecurityTokenServiceExTest : public CreateSecurityTokenServiceTest {
+ protected:
+  CreateSecurityTokenServiceExTest() {
+    agent_->onWait = [] {
+      return Tarnik::MakeRef<Testing::FakeResponse>(200, "OK", IssueAnswer());
+    };
+    configEx_.url = "/used/as/it/stands";
+    configEx_.userAgent = agent_;
+    configEx_.tokenFactory = config_.tokenFactory;
+  }
+
+  Tarnik::Ref<Testing::FakeUserAgent> agent_ = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  SecurityTokenServiceConfigEx configEx_;
+};
+
+TEST_F(CreateSecurityTokenServiceExTest, SendsThroughTheCallersAgentFor240Seconds) {
+  const auto service = CreateSecurityTokenService(configEx_);
+  EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
+  EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
+  EXPECT_THAT(agent_->waitTimeouts, testing::ElementsAre(240'000'000UL, 240'000'000UL));
+}
+
+TEST_F(CreateSecurityTokenServiceExTest, UsesTheUrlAsTheRequestTarget) {
+  Tarnik::Ref<Tarnik::Http::ConnectionSpec> spec;
+  CreateSsoConnectionSpec("127.0.0.1", server_.Port(), false, spec);
+  configEx_.userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+  configEx_.url = "http://proxied.example/sts";
+  EXPECT_NE(CreateSecurityTokenService(configEx_)->AcquireToken("alice", "pw", OneHour()), nullptr);
+  ASSERT_EQ(server_.Requests().size(), 1U);
+  EXPECT_THAT(server_.Requests()[0], StartsWith("POST http://proxied.example/sts HTTP/1.1\r\n"));
+}
+
+TEST_F(CreateSecurityTokenServiceExTest, AnAgentAndATokenFactoryAreNeeded) {
+  configEx_.userAgent = nullptr;
+  EXPECT_EQ(ArgumentError(configEx_), "The HTTP user agent must not be null.");
+  configEx_.tokenFactory = nullptr;
+  EXPECT_EQ(ArgumentError(configEx_), "The token factory must not be null.");
+}
+
+}  // namespace
+}  // namespace SsoClient

@@ -1,0 +1,48 @@
+#include "sts/logger.h"
+
+#include <gmock/gmock.h>
+
+#include <stdexcept>
+
+#include "sts/log_capture.h"
+
+namespace SsoClient {
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+TEST(LoggerTest, IsNamedAfterTheLibrary) {
+  EXPECT_STREQ(kLogger.Name(), "SsoClient");
+}
+
+TEST(OperationLogTest, TellsStartAndEndAtLevelSeven) {
+  const Testing::LogCapture log(7);
+  {
+    const OperationLog operation("AcquireToken");
+    EXPECT_THAT(log.Lines(),
+                ElementsAre("7 START operation SecurityTokenServiceImpl::AcquireToken"));
+  }
+  EXPECT_THAT(log.Lines(), ElementsAre("7 START operation SecurityTokenServiceImpl::AcquireToken",
+                                       "7 END operation SecurityTokenServiceImpl::AcquireToken"));
+}
+
+TEST(OperationLogTest, TellsTheEndOfAnOperationThatFails) {
+  const Testing::LogCapture log(7);
+  try {
+    const OperationLog operation("X");
+    throw std::runtime_error("failed");
+  } catch (const std::runtime_error&) {
+  }
+  EXPECT_THAT(log.Lines(), ElementsAre("7 START operation SecurityTokenServiceImpl::X",
+                                       "7 END operation SecurityTokenServiceImpl::X"));
+}
+
+TEST(OperationLogTest, IsSilentBelowLevelSeven) {
+  const Testing::LogCapture log(6);
+  { const OperationLog operation("X"); }
+  EXPECT_THAT(log.Lines(), IsEmpty());
+}
+
+}  // namespace
+}  // namespace SsoClient

@@ -1,0 +1,142 @@
+#include "sts/request_builder_impl.h"
+
+#include <gmock/gmock.h>
+#include <tarnik/core/exception.h>
+
+#include <string>
+
+#include "support/fake_saml_token.h"
+#include "support/parse_xml.h"
+#include "support/vtable_slot.h"
+#include "xml/built_xml.h"
+#include "xml/unsendable_texts.h"
+
+namespace SsoClient {
+namespace {
+
+using testing::HasSubstr;
+using testing::Not;
+
+constexpr char kIssueAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
+
+TokenSpec SpecOf(std::int64_t seconds) {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = seconds;
+  return spec;
+}
+
+std::string BuiltBody(const TokenSpec& spec, const std::string& user = "alice",
+                      const std::string& password = "pw") {
+  SoapRequest request;
+  RequestBuilderImpl().BuildAcquireTokenRequest(user, password, spec, request);
+  return request.body;
+}
+
+TEST(RequestBuilderImplTest, APasswordRequestIsAnUnsignedEnvelopeThatAsksForABearerToken) {
+  SoapRequest request;
+  RequestBuilderImpl().BuildAcquireTokenRequest("alice", "p<w", SpecOf(3600), request);
+  EXPECT_EQ(request.action, kIssueAction);
+  EXPECT_EQ(
+      Testing::WithoutTimes(request.body),
+      "<soapenv:Envelope xmlns:soapenv=\"http://schemas.xmlsoap.org/soap/envelope/\">"
+      "<soapenv:Header>"
+      "<wsse:Security xmlns:wsse=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-wssecurity-secext-1.0.xsd\">"
+      "<wsu:Timestamp xmlns:wsu=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-wssecurity-utility-1.0.xsd\"><wsu:Created>TIME</wsu:Created>"
+      "<wsu:Expires>TIME</wsu:Expires></wsu:Timestamp>"
+      "<wsse:UsernameToken xmlns:wsse=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-wssecurity-secext-1.0.xsd\"><wsse:Username>alice</wsse:Username>"
+      "<wsse:Password Type=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-username-token-profile-1.0#PasswordText\">p&lt;w</wsse:Password>"
+      "</wsse:UsernameToken></wsse:Security></soapenv:Header>"
+      "<soapenv:Body xmlns:wst=\"http://docs.oasis-open.org/ws-sx/ws-trust/200512\">"
+      "<wst:RequestSecurityToken xmlns:wst=\"http://docs.oasis-open.org/ws-sx/ws-trust/200512\""
+      " xmlns:wst14=\"http://docs.oasis-open.org/ws-sx/ws-trust/200802\">"
+      "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>"
+      "<wst:RequestType>http://docs.oasis-open.org/ws-sx/ws-trust/200512/Issue</wst:RequestType>"
+      "<wst:KeyType>http://docs.oasis-open.org/ws-sx/ws-trust/200512/Bearer</wst:KeyType>"
+      "<wst:Lifetime xmlns:wsu=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-wssecurity-utility-1.0.xsd\"><wsu:Created>TIME</wsu:Created>"
+      "<wsu:Expires>TIME</wsu:Expires></wst:Lifetime>"
+      "<wst:Renewing Allow=\"false\" OK=\"false\"/><wst:Delegatable>false</wst:Delegatable>"
+      "</wst:RequestSecurityToken></soapenv:Body></soapenv:Envelope>");
+}
+
+TEST(RequestBuilderImplTest, TheTimestampIsValidForTenMinutes) {
+  const auto document = Testing::ParseXml(BuiltBody(SpecOf(60)));
+  const auto& header = *document->RootElement()->FirstChildElement("Header");
+  EXPECT_EQ(Testing::TimeAt(header, {"Security", "Timestamp", "Expires"}).GetUtcTime() -
+                Testing::TimeAt(header, {"Security", "Timestamp", "Created"}).GetUtcTime(),
+            600'000'000);
+}
+
+TEST(RequestBuilderImplTest, AnyConfirmationGivesABearerTokenWithoutAKey) {
+  for (const auto confirmation : {CONFIRMATION_DEFAULT, CONFIRMATION_BEARER}) {
+    auto spec = SpecOf(60);
+    spec.confirmation = confirmation;
+    spec.actAsToken = std::make_shared<Testing::FakeSamlToken>("<A/>");
+    const auto body = BuiltBody(spec);
+    EXPECT_THAT(body, HasSubstr("/Bearer</wst:KeyType>"));
+    EXPECT_THAT(body, HasSubstr("<wst14:ActAs><A/></wst14:ActAs>"));
+    EXPECT_THAT(body, Not(HasSubstr("UseKey")));
+    EXPECT_THAT(body, Not(HasSubstr("Signature")));
+  }
+}
+
+TEST(RequestBuilderImplTest, TheLifetimeMustBePositive) {
+  for (const std::int64_t seconds :
+       {std::int64_t{0}, std::int64_t{-1}, std::numeric_limits<std::int64_t>::min()}) {
+    SoapRequest request;
+    request.action = "kept";
+    request.body = "kept too";
+    try {
+      RequestBuilderImpl().BuildAcquireTokenRequest("alice", "pw", SpecOf(seconds), request);
+      ADD_FAILURE() << seconds;
+    } catch (const Tarnik::InvalidArgumentException& error) {
+      EXPECT_EQ(error.Message(), "Token lifetime must be positive");
+    }
+    EXPECT_EQ(request.action, "kept");
+    EXPECT_EQ(request.body, "kept too");
+  }
+  EXPECT_NO_THROW(BuiltBody(SpecOf(1)));
+  EXPECT_NO_THROW(BuiltBody(SpecOf(std::numeric_limits<std::int64_t>::max())));
+}
+
+TEST(RequestBuilderImplTest, EmptyCredentialsAreSentEmpty) {
+  EXPECT_THAT(BuiltBody(SpecOf(60), "", ""), HasSubstr("<wsse:Username></wsse:Username>"));
+}
+
+TEST(RequestBuilderImplTest, CredentialsThatXmlCannotCarryAreRefusedByElement) {
+  const auto failure = [](const std::string& user, const std::string& password) {
+    SoapRequest request;
+    try {
+      RequestBuilderImpl().BuildAcquireTokenRequest(user, password, SpecOf(60), request);
+    } catch (const Tarnik::InvalidArgumentException& error) {
+      EXPECT_EQ(request.body, "");
+      return error.Message();
+    }
+    return std::string("accepted");
+  };
+  for (const auto& text : Testing::UnsendableTexts()) {
+    const auto userFailure = failure(text, "pw");
+    EXPECT_THAT(userFailure, HasSubstr("'wsse:Username'"));
+    EXPECT_THAT(userFailure, Not(HasSubstr("s3cret")));
+    const auto passwordFailure = failure("alice", text);
+    EXPECT_THAT(passwordFailure, HasSubstr("'wsse:Password'"));
+    EXPECT_THAT(passwordFailure, Not(HasSubstr("s3cret")));
+  }
+}
+
+TEST(RequestBuilderImplTest, TheOperationStandsFirst) {
+  const RequestBuilderImpl builder;
+  const RequestBuilder& object = builder;
+  SoapRequest request;
+  using Build =
+      void(const void*, const std::string&, const std::string&, const TokenSpec&, SoapRequest&);
+  TestSupport::VtableSlot<Build>(&object, 0)(&object, "alice", "pw", SpecOf(60), request);
+  EXPECT_EQ(request.action, kIssueAction);
+}
+
+}  // namespace
+}  // namespace SsoClient

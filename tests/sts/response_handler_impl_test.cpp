@@ -1,0 +1,424 @@
+#include "sts/response_handler_impl.h"
+
+#include <gmock/gmock.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/object_impl.h>
+
+#include <functional>
+#include <string>
+#include <typeinfo>
+
+#include "sts/answers.h"
+#include "support/vtable_slot.h"
+
+namespace SsoClient {
+namespace {
+
+using Testing::Collection;
+using testing::ElementsAre;
+using Testing::Envelope;
+using Testing::Fault;
+using testing::IsEmpty;
+using Testing::kAssertionXml;
+using Testing::kCanonicalAssertion;
+using Testing::Requested;
+using Testing::Rstr;
+using testing::StartsWith;
+
+constexpr char kFormat[] = "Unexpected XML format";
+constexpr char kNoBody[] = "Unexpected response format: missing SAOP Body.";
+constexpr char kSamlType[] = "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>";
+
+std::string ParseIssue(const std::string& answer) {
+  std::string assertion;
+  ResponseHandlerImpl().ParseIssueResponse(Tarnik::CreateStringReader(answer).get(), assertion);
+  return assertion;
+}
+
+std::string ParseRenew(const std::string& answer) {
+  std::string assertion;
+  ResponseHandlerImpl().ParseRenewResponse(Tarnik::CreateStringReader(answer).get(), assertion);
+  return assertion;
+}
+
+bool ParseValidate(const std::string& answer) {
+  return ResponseHandlerImpl().ParseValidateResponse(Tarnik::CreateStringReader(answer).get());
+}
+
+NegotiationResponse ParseNegotiation(const std::string& answer) {
+  NegotiationResponse response;
+  ResponseHandlerImpl().ParseNegotiationResponse(Tarnik::CreateStringReader(answer).get(),
+                                                 response);
+  return response;
+}
+
+// The message of the plain SsoException that `parse` throws.
+std::string Failure(const std::function<void()>& parse) {
+  try {
+    parse();
+  } catch (const SsoException& error) {
+    EXPECT_EQ(typeid(error), typeid(SsoException));
+    return error.Message();
+  }
+  return "no failure";
+}
+
+using Parser = std::function<void(const std::string&)>;
+
+const std::vector<std::pair<std::string, Parser>>& AllParsers() {
+  static const std::vector<std::pair<std::string, Parser>> kParsers = {
+      {"issue", [](const std::string& answer) { ParseIssue(answer); }},
+      {"renew", [](const std::string& answer) { ParseRenew(answer); }},
+      {"validate", [](const std::string& answer) { ParseValidate(answer); }},
+      {"negotiation", [](const std::string& answer) { ParseNegotiation(answer); }},
+  };
+  return kParsers;
+}
+
+std::string IssueAnswer() {
+  return Envelope(Collection(Rstr(Requested(kAssertionXml))));
+}
+std::string RenewAnswer() {
+  return Envelope(Rstr(Requested(kAssertionXml)));
+}
+std::string StatusAnswer(const std::string& code) {
+  return Envelope(Rstr("<wst:Status><wst:Code>" + code + "</wst:Code></wst:Status>"));
+}
+std::string LegAnswer(const std::string& exchange) {
+  return Envelope(Rstr(exchange, " Context=\"urn:uuid:1\""));
+}
+std::string FinalLegAnswer(const std::string& content) {
+  return Envelope(Collection(Rstr(content, " Context=\"urn:uuid:1\"")));
+}
+
+constexpr char kValid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid";
+constexpr char kInvalid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid";
+
+// What every operation does before it looks into the body.
+
+TEST(ResponseHandlerImplTest, AnAnswerThatIsNoXmlSaysWhy) {
+  for (const auto& [name, parse] : AllParsers()) {
+    for (const std::string answer : {"", "no XML", "<a>", "<a></b>", "<a/><b/>", "<p:a/>",
+                                     "<!DOCTYPE a><a/>", "<a>\xff</a>", "<a b='1' b='2'/>"}) {
+      EXPECT_THAT(Failure([&, &parser = parse] { parser(answer); }),
+                  StartsWith("Response is not well-formed XML: "))
+          << name << ": " << answer;
+    }
+  }
+}
+
+TEST(ResponseHandlerImplTest, AnAnswerNeedsABody) {
+  for (const auto& [name, parse] : AllParsers()) {
+    for (const std::string answer :
+         {"<Envelope/>", "<Envelope>Body</Envelope>", "<Envelope><Header/><Fault/></Envelope>",
+          "<Body/>", "<Envelope><a><Body/></a></Envelope>", "<Envelope><body/></Envelope>"}) {
+      EXPECT_EQ(Failure([&, &parser = parse] { parser(answer); }), kNoBody)
+          << name << ": " << answer;
+    }
+  }
+}
+
+TEST(ResponseHandlerImplTest, AFaultIsReportedBeforeTheBodyIsExamined) {
+  const std::string everything =
+      Rstr(Requested(kAssertionXml), " Context=\"c\"") + Collection(Rstr(Requested(kAssertionXml)));
+  for (const auto& [name, parse] : AllParsers()) {
+    for (const auto& body :
+         {Fault("S:Server", "busy") + everything, everything + Fault("S:Server", "busy")}) {
+      EXPECT_EQ(Failure([&, &parser = parse] { parser(Envelope(body)); }),
+                "Unexpected SOAP fault: S:Server; request failed.")
+          << name;
+    }
+    EXPECT_THROW(parse(Envelope(Fault("wst:FailedAuthentication", "no"))),
+                 InvalidCredentialsException)
+        << name;
+    EXPECT_THROW(parse(Envelope(Fault("wst:FailedAuthentication",
+                                      "Password of the user logging on is expired"))),
+                 PasswordExpiredException)
+        << name;
+  }
+}
+
+TEST(ResponseHandlerImplTest, OfTwoBodiesTheFirstCounts) {
+  const std::string second =
+      "<Body>" + Collection(Rstr(Requested("<Assertion n=\"2\"/>"))) + "</Body>";
+  const std::string start = R"(<E xmlns:wst="urn:w"><Body>)";
+  EXPECT_EQ(Failure([&] { ParseIssue(start + "</Body>" + second + "</E>"); }), kFormat);
+  EXPECT_EQ(ParseIssue(start + Collection(Rstr(Requested("<Assertion n=\"1\"/>"))) + "</Body>" +
+                       second + "</E>"),
+            R"(<Assertion xmlns:wst="urn:w" n="1"></Assertion>)");
+  EXPECT_EQ(Failure([&] {
+              ParseIssue(start + "</Body><Body><Fault><faultcode>x</faultcode></Fault></Body></E>");
+            }),
+            kFormat);
+}
+
+TEST(ResponseHandlerImplTest, AnAnswerCutOffAnywhereIsNoAnswer) {
+  const struct {
+    std::string answer;
+    Parser parse;
+  } kCases[] = {
+      {IssueAnswer(), AllParsers()[0].second},
+      {RenewAnswer(), AllParsers()[1].second},
+      {StatusAnswer(kValid), AllParsers()[2].second},
+      {LegAnswer("<wst:BinaryExchange>QUJD</wst:BinaryExchange>"), AllParsers()[3].second},
+      {FinalLegAnswer(kSamlType + Requested(kAssertionXml)), AllParsers()[3].second},
+  };
+  for (const auto& test : kCases) {
+    EXPECT_NO_THROW(test.parse(test.answer));
+    for (std::size_t length = 0; length < test.answer.size(); ++length) {
+      EXPECT_THAT(Failure([&] { test.parse(test.answer.substr(0, length)); }),
+                  StartsWith("Response is not well-formed XML: "))
+          << length;
+    }
+  }
+}
+
+class FailingReader final : public Tarnik::Reader, public Tarnik::ObjectImpl {
+ public:
+  std::size_t Read(char*, std::size_t) override { throw Tarnik::IOException("cut off"); }
+};
+
+TEST(ResponseHandlerImplTest, FailuresOfTheReaderPassUnchanged) {
+  const auto reader = Tarnik::MakeRef<FailingReader>();
+  std::string assertion = "kept";
+  EXPECT_THROW(ResponseHandlerImpl().ParseIssueResponse(reader.get(), assertion),
+               Tarnik::IOException);
+  EXPECT_EQ(assertion, "kept");
+}
+
+TEST(ResponseHandlerImplTest, AFailureLeavesTheOutputAsItWas) {
+  std::string assertion = "kept";
+  const auto reader = Tarnik::CreateStringReader(Envelope(""));
+  EXPECT_THROW(ResponseHandlerImpl().ParseIssueResponse(reader.get(), assertion), SsoException);
+  EXPECT_EQ(assertion, "kept");
+}
+
+// Issue.
+
+TEST(ParseIssueResponseTest, GivesTheCanonicalAssertionWithItsInheritedNamespaces) {
+  EXPECT_EQ(ParseIssue(IssueAnswer()), kCanonicalAssertion);
+}
+
+TEST(ParseIssueResponseTest, IgnoresWhatStandsBeside) {
+  EXPECT_EQ(ParseIssue(Envelope(
+                "text<other/>" +
+                Collection("<!-- c -->" +
+                           Rstr("<wst:TokenType>any</wst:TokenType><wst:Lifetime/>" +
+                                Requested("\n <!-- c --> " + std::string(kAssertionXml) + "text")) +
+                           Rstr(Requested("<Assertion/>"))))),
+            kCanonicalAssertion);
+}
+
+TEST(ParseIssueResponseTest, OfTwoAssertionsTheFirstCounts) {
+  const std::string second = "<Assertion n=\"2\"/>";
+  EXPECT_EQ(ParseIssue(Envelope(Collection(Rstr(Requested(kAssertionXml + second))))),
+            kCanonicalAssertion);
+  EXPECT_EQ(
+      ParseIssue(Envelope(Collection(Rstr(Requested(kAssertionXml)) + Rstr(Requested(second))))),
+      kCanonicalAssertion);
+  EXPECT_EQ(ParseIssue(Envelope(Collection(Rstr(Requested(kAssertionXml) + Requested(second))))),
+            kCanonicalAssertion);
+}
+
+TEST(ParseIssueResponseTest, AFirstResponseWithoutAnAssertionIsNotPassedOver) {
+  EXPECT_EQ(
+      Failure([] { ParseIssue(Envelope(Collection(Rstr("") + Rstr(Requested(kAssertionXml))))); }),
+      kFormat);
+  EXPECT_EQ(Failure([] {
+              ParseIssue(Envelope(Collection("") + Collection(Rstr(Requested(kAssertionXml)))));
+            }),
+            kFormat);
+}
+
+TEST(ParseIssueResponseTest, ComparesNoNamespaces) {
+  EXPECT_EQ(ParseIssue(R"(<a:E xmlns:a="urn:a"><a:Body><RequestSecurityTokenResponseCollection>)"
+                       "<a:RequestSecurityTokenResponse><RequestedSecurityToken><a:Assertion/>"
+                       "</RequestedSecurityToken></a:RequestSecurityTokenResponse>"
+                       "</RequestSecurityTokenResponseCollection></a:Body></a:E>"),
+            R"(<a:Assertion xmlns:a="urn:a"></a:Assertion>)");
+}
+
+TEST(ParseIssueResponseTest, EveryElementOnTheWayIsNeeded) {
+  for (const auto& body :
+       {std::string(), Rstr(Requested(kAssertionXml)), Collection(""), Collection(Rstr("")),
+        Collection(Rstr(Requested(""))), Collection(Rstr(kAssertionXml)),
+        Collection(Requested(kAssertionXml)), Collection(Rstr(Requested("<Encrypted/>"))),
+        Collection(Rstr(Requested("<x>" + std::string(kAssertionXml) + "</x>"))),
+        std::string("<!--") + Collection("") + "-->",
+        "<![CDATA[" + Collection(Rstr(Requested(kAssertionXml))) + "]]>"}) {
+    EXPECT_EQ(Failure([&] { ParseIssue(Envelope(body)); }), kFormat) << body;
+  }
+}
+
+// Renew.
+
+TEST(ParseRenewResponseTest, GivesTheCanonicalAssertion) {
+  EXPECT_EQ(ParseRenew(RenewAnswer()), kCanonicalAssertion);
+}
+
+TEST(ParseRenewResponseTest, EveryElementOnTheWayIsNeededAndNoCollection) {
+  for (const auto& body : {std::string(), Collection(Rstr(Requested(kAssertionXml))), Rstr(""),
+                           Rstr(Requested("")), Rstr(kAssertionXml), Requested(kAssertionXml)}) {
+    EXPECT_EQ(Failure([&] { ParseRenew(Envelope(body)); }), kFormat) << body;
+  }
+}
+
+// Validate.
+
+TEST(ParseValidateResponseTest, TellsTheVerdict) {
+  EXPECT_TRUE(ParseValidate(StatusAnswer(kValid)));
+  EXPECT_FALSE(ParseValidate(StatusAnswer(kInvalid)));
+  EXPECT_TRUE(ParseValidate(StatusAnswer("<![CDATA[" + std::string(kValid) + "]]>")));
+}
+
+TEST(ParseValidateResponseTest, AnyOtherCodeIsUnexpected) {
+  for (const std::string code :
+       {std::string(), " " + std::string(kValid), std::string(kValid) + " ",
+        std::string(kValid) + "\n", std::string(kValid) + "x",
+        std::string("http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/VALID"),
+        std::string("valid"), "<b>" + std::string(kValid) + "</b>",
+        "<!-- c -->" + std::string(kValid), "<?pi?>" + std::string(kValid)}) {
+    EXPECT_EQ(Failure([&] { ParseValidate(StatusAnswer(code)); }), kFormat) << code;
+  }
+}
+
+TEST(ParseValidateResponseTest, EveryElementOnTheWayIsNeeded) {
+  const std::string code = "<wst:Code>" + std::string(kValid) + "</wst:Code>";
+  const std::string status = "<wst:Status>" + code + "</wst:Status>";
+  for (const auto& body : {std::string(), Rstr(""), Rstr("<wst:Status/>"), Rstr(code), status,
+                           Collection(Rstr(status))}) {
+    EXPECT_EQ(Failure([&] { ParseValidate(Envelope(body)); }), kFormat) << body;
+  }
+}
+
+// Negotiation.
+
+constexpr char kLeg[] = "<wst:BinaryExchange>AP8Q</wst:BinaryExchange>";
+
+TEST(ParseNegotiationResponseTest, AnIntermediateLegHasNoToken) {
+  const auto response =
+      ParseNegotiation(LegAnswer(kLeg + std::string(kSamlType) + Requested(kAssertionXml)));
+  EXPECT_EQ(response.contextId, "urn:uuid:1");
+  EXPECT_THAT(response.leg, ElementsAre(0x00, 0xff, 0x10));
+  EXPECT_EQ(response.token, "");
+}
+
+TEST(ParseNegotiationResponseTest, TheFinalAnswerHasTheTokenAndPerhapsALeg) {
+  const std::string token = kSamlType + Requested(kAssertionXml);
+  const auto withLeg = ParseNegotiation(FinalLegAnswer(kLeg + token));
+  EXPECT_EQ(withLeg.contextId, "urn:uuid:1");
+  EXPECT_THAT(withLeg.leg, ElementsAre(0x00, 0xff, 0x10));
+  EXPECT_EQ(withLeg.token, kCanonicalAssertion);
+  for (const std::string exchange :
+       {"", "<wst:BinaryExchange/>", "<wst:BinaryExchange><b>AP8Q</b></wst:BinaryExchange>"}) {
+    const auto without = ParseNegotiation(FinalLegAnswer(exchange + token));
+    EXPECT_THAT(without.leg, IsEmpty());
+    EXPECT_EQ(without.token, kCanonicalAssertion);
+  }
+}
+
+TEST(ParseNegotiationResponseTest, AResponseOutsideOfACollectionIsIntermediate) {
+  const auto response = ParseNegotiation(
+      Envelope(Collection(Rstr(kSamlType + Requested(kAssertionXml), " Context=\"final\"")) +
+               Rstr(kLeg, " Context=\"intermediate\"")));
+  EXPECT_EQ(response.contextId, "intermediate");
+  EXPECT_EQ(response.token, "");
+}
+
+TEST(ParseNegotiationResponseTest, AnIntermediateLegIsNeeded) {
+  for (const std::string exchange :
+       {"", "<wst:BinaryExchange/>", "<wst:BinaryExchange></wst:BinaryExchange>",
+        "<wst:BinaryExchange><!-- c -->AP8Q</wst:BinaryExchange>"}) {
+    EXPECT_EQ(Failure([&] { ParseNegotiation(LegAnswer(exchange)); }), kFormat) << exchange;
+  }
+}
+
+TEST(ParseNegotiationResponseTest, TheContextIsNeeded) {
+  EXPECT_EQ(Failure([] { ParseNegotiation(Envelope(Rstr(kLeg))); }), kFormat);
+  EXPECT_EQ(Failure([] { ParseNegotiation(Envelope(Rstr(kLeg, " context=\"c\""))); }), kFormat);
+  EXPECT_EQ(Failure([] { ParseNegotiation(Envelope(Rstr(kLeg, " wst:Context=\"c\""))); }), kFormat);
+  EXPECT_EQ(Failure([] {
+              ParseNegotiation(Envelope(Collection(Rstr(kSamlType + Requested(kAssertionXml)))));
+            }),
+            kFormat);
+  EXPECT_EQ(ParseNegotiation(Envelope(Rstr(kLeg, " Context=\"\""))).contextId, "");
+}
+
+TEST(ParseNegotiationResponseTest, AResponseIsNeeded) {
+  for (const auto& body : {std::string(), Collection(""), Requested(kAssertionXml)}) {
+    EXPECT_EQ(Failure([&] { ParseNegotiation(Envelope(body)); }), kFormat) << body;
+  }
+}
+
+TEST(ParseNegotiationResponseTest, TheLegIsBase64) {
+  for (const std::string leg : {"!", "AP8", "AP8Q=", "A===", "AP-Q"}) {
+    const std::string exchange = "<wst:BinaryExchange>" + leg + "</wst:BinaryExchange>";
+    EXPECT_EQ(Failure([&] { ParseNegotiation(LegAnswer(exchange)); }), "Base64 format exception")
+        << leg;
+    EXPECT_EQ(Failure([&] {
+                ParseNegotiation(FinalLegAnswer(exchange + kSamlType + Requested(kAssertionXml)));
+              }),
+              "Base64 format exception")
+        << leg;
+  }
+}
+
+TEST(ParseNegotiationResponseTest, TheFinalAnswerNeedsAnAssertion) {
+  for (const auto& content :
+       {std::string(kSamlType), kSamlType + Requested(""), kSamlType + std::string(kAssertionXml),
+        std::string("<wst:TokenType>other</wst:TokenType>")}) {
+    EXPECT_EQ(Failure([&] { ParseNegotiation(FinalLegAnswer(kLeg + content)); }), kFormat)
+        << content;
+  }
+}
+
+TEST(ParseNegotiationResponseTest, TheTokenTypeIsComparedWhole) {
+  const struct {
+    std::string element;
+    std::string type;
+  } kCases[] = {
+      {"<wst:TokenType>urn:other</wst:TokenType>", "urn:other"},
+      {"<wst:TokenType> urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>",
+       " urn:oasis:names:tc:SAML:2.0:assertion"},
+      {"<wst:TokenType/>", ""},
+      {"<wst:TokenType><b/></wst:TokenType>", ""},
+      {"", ""},
+  };
+  for (const auto& test : kCases) {
+    EXPECT_EQ(
+        Failure([&] { ParseNegotiation(FinalLegAnswer(test.element + Requested(kAssertionXml))); }),
+        "Invalid token type: " + test.type + " (expected: urn:oasis:names:tc:SAML:2.0:assertion");
+  }
+}
+
+TEST(ParseNegotiationResponseTest, ReplacesWhatTheRecordHeld) {
+  NegotiationResponse response = {"old", {1, 2, 3}, "old token"};
+  const auto reader = Tarnik::CreateStringReader(LegAnswer(kLeg));
+  ResponseHandlerImpl().ParseNegotiationResponse(reader.get(), response);
+  EXPECT_EQ(response.contextId, "urn:uuid:1");
+  EXPECT_THAT(response.leg, ElementsAre(0x00, 0xff, 0x10));
+  EXPECT_EQ(response.token, "");
+}
+
+TEST(ResponseHandlerImplTest, OperationsStandInTheirOrder) {
+  const ResponseHandlerImpl handler;
+  const ResponseHandler& object = handler;
+  using ParseText = void(const void*, Tarnik::Reader*, std::string&);
+  std::string assertion;
+  TestSupport::VtableSlot<ParseText>(&object, 0)(
+      &object, Tarnik::CreateStringReader(IssueAnswer()).get(), assertion);
+  EXPECT_EQ(assertion, kCanonicalAssertion);
+  EXPECT_TRUE((TestSupport::VtableSlot<bool(const void*, Tarnik::Reader*)>(&object, 1)(
+      &object, Tarnik::CreateStringReader(StatusAnswer(kValid)).get())));
+  assertion.clear();
+  TestSupport::VtableSlot<ParseText>(&object, 2)(
+      &object, Tarnik::CreateStringReader(RenewAnswer()).get(), assertion);
+  EXPECT_EQ(assertion, kCanonicalAssertion);
+  NegotiationResponse response;
+  TestSupport::VtableSlot<void(const void*, Tarnik::Reader*, NegotiationResponse&)>(&object, 3)(
+      &object, Tarnik::CreateStringReader(LegAnswer(kLeg)).get(), response);
+  EXPECT_EQ(response.contextId, "urn:uuid:1");
+}
+
+}  // namespace
+}  // namespace SsoClient

@@ -1,0 +1,327 @@
+#include "sts/security_token_service_impl.h"
+
+#include <gmock/gmock.h>
+
+#include <future>
+#include <optional>
+#include <string>
+#include <typeinfo>
+#include <utility>
+#include <vector>
+
+#include "describe/describe.h"
+#include "sts/answers.h"
+#include "sts/log_capture.h"
+#include "sts/request_builder_impl.h"
+#include "sts/response_handler_impl.h"
+#include "support/fake_saml_token.h"
+#include "support/vtable_slot.h"
+
+namespace SsoClient {
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+
+class FakeTransport final : public Transport {
+ public:
+  explicit FakeTransport(std::string answer) : answer_(std::move(answer)) {}
+
+  std::shared_ptr<TransportSession> CreateSession() const override {
+    ++sessions;
+    return std::make_shared<Session>(*this);
+  }
+
+  mutable int sessions = 0;
+  mutable std::vector<std::string> actions;
+  mutable std::vector<std::string> bodies;
+  std::optional<CommunicationException> failure;
+
+ private:
+  class Session final : public TransportSession {
+   public:
+    explicit Session(const FakeTransport& transport) : transport_(transport) {}
+
+    void SendRequest(const SoapRequest& request,
+                     Tarnik::Ref<Tarnik::Reader>& reader) const override {
+      transport_.actions.push_back(request.action);
+      transport_.bodies.push_back(request.body);
+      if (transport_.failure) {
+        transport_.failure->Throw();
+      }
+      reader = Tarnik::CreateStringReader(transport_.answer_);
+    }
+
+    void SendRequestAsync(const SoapRequest&, const Completion&,
+                          Tarnik::Ref<Tarnik::Http::PendingRequestItem>&) const override {
+      FAIL() << "the service sends synchronously";
+    }
+
+   private:
+    const FakeTransport& transport_;
+  };
+
+  std::string answer_;
+};
+
+class FakeTokenFactory final : public SamlTokenFactory {
+ public:
+  std::shared_ptr<const SamlToken> CreateToken(const std::string&) const override {
+    throw std::logic_error("the tolerance must be given");
+  }
+  std::shared_ptr<const SamlToken> CreateToken(const std::string& xml,
+                                               long clockToleranceSec) const override {
+    texts.push_back(xml);
+    tolerances.push_back(clockToleranceSec);
+    if (isRefusing) {
+      throw InvalidSignatureException("refused");
+    }
+    return std::make_shared<Testing::FakeSamlToken>(xml);
+  }
+  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
+    throw std::logic_error("the text must be given");
+  }
+  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*, long) const override {
+    throw std::logic_error("the text must be given");
+  }
+
+  bool isRefusing = false;
+  mutable std::vector<std::string> texts;
+  mutable std::vector<long> tolerances;
+};
+
+class EmptyResponseHandler final : public ResponseHandler {
+ public:
+  void ParseIssueResponse(Tarnik::Reader*, std::string& assertion) const override {
+    assertion.clear();
+  }
+  bool ParseValidateResponse(Tarnik::Reader*) const override { return false; }
+  void ParseRenewResponse(Tarnik::Reader*, std::string&) const override {}
+  void ParseNegotiationResponse(Tarnik::Reader*, NegotiationResponse&) const override {}
+};
+
+std::string IssueAnswer() {
+  return Testing::Envelope(
+      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
+}
+
+TokenSpec OneHour() {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 3600;
+  return spec;
+}
+
+class SecurityTokenServiceImplTest : public testing::Test {
+ protected:
+  explicit SecurityTokenServiceImplTest(const std::string& answer = IssueAnswer())
+      : transport_(std::make_shared<FakeTransport>(answer)) {}
+
+  std::shared_ptr<SecurityTokenServiceImpl> MakeService() const {
+    return std::make_shared<SecurityTokenServiceImpl>(std::make_shared<RequestBuilderImpl>(),
+                                                      transport_, handler_, factory_);
+  }
+
+  std::shared_ptr<FakeTransport> transport_;
+  std::shared_ptr<const ResponseHandler> handler_ = std::make_shared<ResponseHandlerImpl>();
+  std::shared_ptr<FakeTokenFactory> factory_ = std::make_shared<FakeTokenFactory>();
+};
+
+TEST_F(SecurityTokenServiceImplTest, SendsTheRequestAndMakesATokenOfTheAnswer) {
+  const auto token = MakeService()->AcquireToken("alice", "hunter2", OneHour());
+  ASSERT_NE(token, nullptr);
+  EXPECT_EQ(token->Xml(), Testing::kCanonicalAssertion);
+  EXPECT_EQ(transport_->sessions, 1);
+  EXPECT_THAT(transport_->actions,
+              ElementsAre("http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue"));
+  ASSERT_EQ(transport_->bodies.size(), 1U);
+  EXPECT_THAT(transport_->bodies[0], HasSubstr("<wsse:Username>alice</wsse:Username>"));
+  EXPECT_THAT(transport_->bodies[0], HasSubstr(">hunter2</wsse:Password>"));
+  EXPECT_THAT(factory_->texts, ElementsAre(Testing::kCanonicalAssertion));
+  EXPECT_THAT(factory_->tolerances, ElementsAre(600));
+}
+
+TEST_F(SecurityTokenServiceImplTest, EveryOperationHasASessionOfItsOwn) {
+  const auto service = MakeService();
+  service->AcquireToken("alice", "pw", OneHour());
+  service->AcquireToken("alice", "pw", OneHour());
+  EXPECT_EQ(transport_->sessions, 2);
+}
+
+TEST_F(SecurityTokenServiceImplTest, AnEmptyAssertionGivesNoToken) {
+  handler_ = std::make_shared<EmptyResponseHandler>();
+  const Testing::LogCapture log(9);
+  EXPECT_EQ(MakeService()->AcquireToken("alice", "pw", OneHour()), nullptr);
+  EXPECT_THAT(factory_->texts, IsEmpty());
+  EXPECT_THAT(log.Lines(), Not(testing::Contains(HasSubstr("Successfully"))));
+}
+
+TEST_F(SecurityTokenServiceImplTest, TracesTheOperation) {
+  const Testing::LogCapture log(7);
+  auto spec = OneHour();
+  spec.audienceRestriction = {"aud"};
+  const auto token = MakeService()->AcquireToken("alice", "hunter2", spec);
+  EXPECT_THAT(log.Lines(),
+              ElementsAre("7 START operation SecurityTokenServiceImpl::AcquireToken",
+                          "7 Requested token for subject `alice', spec `" + Describe(spec) + "'",
+                          "7 SecurityTokenServiceImpl::AcquireToken sending request",
+                          "7 SecurityTokenServiceImpl::AcquireToken processing response",
+                          "5 Successfully acquired token: " + CreateSamlTokenDescription(*token),
+                          "7 END operation SecurityTokenServiceImpl::AcquireToken"));
+}
+
+TEST_F(SecurityTokenServiceImplTest, TellsOnlyTheSuccessAtLevelsFiveAndSix) {
+  for (const int level : {5, 6}) {
+    const Testing::LogCapture log(level);
+    const auto token = MakeService()->AcquireToken("alice", "pw", OneHour());
+    EXPECT_THAT(log.Lines(), ElementsAre("5 Successfully acquired token: " +
+                                         CreateSamlTokenDescription(*token)));
+  }
+  const Testing::LogCapture log(4);
+  MakeService()->AcquireToken("alice", "pw", OneHour());
+  EXPECT_THAT(log.Lines(), IsEmpty());
+}
+
+TEST_F(SecurityTokenServiceImplTest, NeverLogsAPasswordOrAToken) {
+  const Testing::LogCapture log(9);
+  MakeService()->AcquireToken("alice", "hunter2", OneHour());
+  EXPECT_THAT(log.Lines(), testing::Each(Not(HasSubstr("hunter2"))));
+  EXPECT_THAT(log.Lines(), testing::Each(Not(HasSubstr("<saml2:"))));
+}
+
+TEST_F(SecurityTokenServiceImplTest, AnArgumentErrorIsThrownBeforeAnythingIsSent) {
+  const Testing::LogCapture log(7);
+  try {
+    MakeService()->AcquireToken("alice", "pw", TokenSpec());
+    FAIL();
+  } catch (const Tarnik::InvalidArgumentException& error) {
+    EXPECT_EQ(error.Message(), "Token lifetime must be positive");
+  }
+  EXPECT_EQ(transport_->sessions, 0);
+  EXPECT_THAT(log.Lines(), ElementsAre("7 START operation SecurityTokenServiceImpl::AcquireToken",
+                                       "7 Requested token for subject `alice', spec `" +
+                                           Describe(TokenSpec()) + "'",
+                                       "7 END operation SecurityTokenServiceImpl::AcquireToken"));
+}
+
+TEST_F(SecurityTokenServiceImplTest, FailuresOfTheExchangePassUnchanged) {
+  transport_->failure.emplace("Server returned error: 503 Service Unavailable");
+  const Testing::LogCapture log(7);
+  try {
+    MakeService()->AcquireToken("alice", "pw", OneHour());
+    FAIL();
+  } catch (const CommunicationException& error) {
+    EXPECT_EQ(error.Message(), "Server returned error: 503 Service Unavailable");
+  }
+  EXPECT_THAT(log.Lines(), ElementsAre("7 START operation SecurityTokenServiceImpl::AcquireToken",
+                                       HasSubstr("7 Requested token"),
+                                       "7 SecurityTokenServiceImpl::AcquireToken sending request",
+                                       "7 END operation SecurityTokenServiceImpl::AcquireToken"));
+}
+
+TEST_F(SecurityTokenServiceImplTest, RefusalsOfTheTokenFactoryPassUnchanged) {
+  factory_->isRefusing = true;
+  const Testing::LogCapture log(7);
+  EXPECT_THROW(MakeService()->AcquireToken("alice", "pw", OneHour()), InvalidSignatureException);
+  EXPECT_EQ(log.Lines().back(), "7 END operation SecurityTokenServiceImpl::AcquireToken");
+  EXPECT_THAT(log.Lines(), Not(testing::Contains(HasSubstr("Successfully"))));
+}
+
+class FaultedServiceTest : public SecurityTokenServiceImplTest {
+ protected:
+  FaultedServiceTest()
+      : SecurityTokenServiceImplTest(
+            Testing::Envelope(Testing::Fault("wst:FailedAuthentication", "Invalid credentials"))) {}
+};
+
+TEST_F(FaultedServiceTest, FaultsPassUnchanged) {
+  try {
+    MakeService()->AcquireToken("alice", "pw", OneHour());
+    FAIL();
+  } catch (const InvalidCredentialsException& error) {
+    EXPECT_EQ(error.Message(), "Authentication failed: Invalid credentials");
+  }
+}
+
+struct Report {
+  std::shared_ptr<const SamlToken> token;
+  std::string errorType;
+  std::string message;
+};
+
+class AsyncCall {
+ public:
+  SecurityTokenService::TokenCallback Callback() {
+    return [promise = promise_](const std::shared_ptr<const SamlToken>& token,
+                                const Tarnik::Exception* error) {
+      promise->set_value({token, error != nullptr ? typeid(*error).name() : "",
+                          error != nullptr ? error->Message() : ""});
+    };
+  }
+  Report Wait() { return promise_->get_future().get(); }
+
+ private:
+  std::shared_ptr<std::promise<Report>> promise_ = std::make_shared<std::promise<Report>>();
+};
+
+using SecurityTokenServiceImplAsyncTest = SecurityTokenServiceImplTest;
+
+TEST_F(SecurityTokenServiceImplAsyncTest, ReportsTheToken) {
+  AsyncCall call;
+  MakeService()->AcquireTokenAsync("alice", "hunter2", OneHour(), call.Callback());
+  const auto report = call.Wait();
+  ASSERT_NE(report.token, nullptr);
+  EXPECT_EQ(report.token->Xml(), Testing::kCanonicalAssertion);
+  EXPECT_EQ(report.errorType, "");
+  EXPECT_THAT(transport_->bodies[0], HasSubstr(">hunter2</wsse:Password>"));
+}
+
+TEST_F(SecurityTokenServiceImplAsyncTest, CopiesItsArgumentsAndOutlivesTheService) {
+  AsyncCall call;
+  {
+    auto service = MakeService();
+    std::string user = "alice";
+    std::string password = "hunter2";
+    auto spec = OneHour();
+    service->AcquireTokenAsync(user, password, spec, call.Callback());
+    service = nullptr;
+    user = "mallory";
+    password = "other";
+    spec.tokenLifetimeSec = 0;
+  }
+  EXPECT_NE(call.Wait().token, nullptr);
+  EXPECT_THAT(transport_->bodies[0], HasSubstr("<wsse:Username>alice</wsse:Username>"));
+}
+
+TEST_F(SecurityTokenServiceImplAsyncTest, ErrorsReachTheCallbackAndNeverTheCaller) {
+  AsyncCall call;
+  MakeService()->AcquireTokenAsync("alice", "pw", TokenSpec(), call.Callback());
+  const auto report = call.Wait();
+  EXPECT_EQ(report.token, nullptr);
+  EXPECT_EQ(report.errorType, typeid(Tarnik::InvalidArgumentException).name());
+  EXPECT_EQ(report.message, "Token lifetime must be positive");
+}
+
+TEST_F(SecurityTokenServiceImplAsyncTest, AnEmptyCallbackIsRefusedAtTheCall) {
+  EXPECT_THROW(MakeService()->AcquireTokenAsync("alice", "pw", OneHour(), nullptr),
+               Tarnik::InvalidArgumentException);
+  EXPECT_EQ(transport_->sessions, 0);
+}
+
+TEST_F(SecurityTokenServiceImplTest, OperationsStandInTheirOrder) {
+  const auto service = MakeService();
+  const SecurityTokenService* object = service.get();
+  using Acquire = std::shared_ptr<const SamlToken>(const void*, const std::string&,
+                                                   const std::string&, const TokenSpec&);
+  EXPECT_NE(TestSupport::VtableSlot<Acquire>(object, 0)(object, "alice", "pw", OneHour()), nullptr);
+  using AcquireAsync = void(const void*, const std::string&, const std::string&, const TokenSpec&,
+                            SecurityTokenService::TokenCallback);
+  AsyncCall call;
+  TestSupport::VtableSlot<AcquireAsync>(object, 1)(object, "alice", "pw", OneHour(),
+                                                   call.Callback());
+  EXPECT_NE(call.Wait().token, nullptr);
+}
+
+}  // namespace
+}  // namespace SsoClient

@@ -1,0 +1,47 @@
+#ifndef SSOCLIENT_TESTS_SUPPORT_FAKE_SAML_TOKEN_H
+#define SSOCLIENT_TESTS_SUPPORT_FAKE_SAML_TOKEN_H
+
+#include <string>
+#include <utility>
+
+#include <ssoclient/saml_token.h>
+
+namespace SsoClient::Testing {
+
+/// A token that is nothing but its text and its subject's name.
+class FakeSamlToken final : public SamlToken {
+ public:
+  explicit FakeSamlToken(std::string xml, std::string subjectName = "alice")
+      : xml_(std::move(xml)), subject_{std::move(subjectName), "CORP"} {}
+
+  const std::string& Id() const override { return empty_; }
+  const Tarnik::System::DateTime& StartTime() const override { return time_; }
+  const Tarnik::System::DateTime& ExpirationTime() const override { return time_; }
+  Tarnik::System::DateTime ExpirationTimeWithTolerance() const override { return time_; }
+  const PrincipalId& Subject() const override { return subject_; }
+  bool IsRenewable() const override { return false; }
+  bool IsDelegable() const override { return false; }
+  bool IsSolution() const override { return false; }
+  TokenConfirmationType ConfirmationType() const override { return BEARER; }
+  void GetSubjectNames(SubjectNames& names) const override { names = {}; }
+  void GetGroups(std::vector<PrincipalId>& groups) const override { groups.clear(); }
+  void GetDelegationChain(std::vector<Delegate>& chain) const override { chain.clear(); }
+  void GetAudiences(std::set<std::string>& audiences) const override { audiences.clear(); }
+  void GetAdvice(std::vector<Advice>& advice) const override { advice.clear(); }
+  Tarnik::Ref<const Tarnik::Crypto::Certificate> HolderOfKeyCertificate() const override {
+    return nullptr;
+  }
+  const std::string& Issuer() const override { return empty_; }
+  Tarnik::Ref<Tarnik::Xml::Security::Signature> GetSignature() const override { return nullptr; }
+  const std::string& Xml() const override { return xml_; }
+
+ private:
+  std::string xml_;
+  std::string empty_;
+  PrincipalId subject_;
+  Tarnik::System::DateTime time_;
+};
+
+}  // namespace SsoClient::Testing
+
+#endif

@@ -1,0 +1,65 @@
+#ifndef SSOCLIENT_TESTS_TRANSPORT_CONNECT_RECORDER_H
+#define SSOCLIENT_TESTS_TRANSPORT_CONNECT_RECORDER_H
+
+#include <chrono>
+#include <future>
+#include <memory>
+#include <stdexcept>
+#include <string>
+#include <utility>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/connection_spec.h>
+#include <tarnik/system/stream.h>
+
+namespace SsoClient::Testing {
+
+/// Records what a connection's completion is called with. It waits until the last copy of the
+/// completion is gone, so that a second call cannot come unseen.
+class ConnectRecorder {
+ public:
+  Tarnik::Http::CustomConnectionSpec::ConnectCompletion Completion() {
+    auto token = std::make_shared<Token>(gone_);
+    return [this, token](Tarnik::System::Stream* stream, Tarnik::Exception* error) {
+      ++calls;
+      lastStream = stream;
+      hasError = error != nullptr;
+      if (error != nullptr) {
+        message = error->Message();
+        isCancelled = dynamic_cast<Tarnik::CancelledException*>(error) != nullptr;
+      }
+    };
+  }
+
+  void Wait() {
+    if (future_.wait_for(std::chrono::seconds(20)) != std::future_status::ready) {
+      throw std::runtime_error("the completion was not dropped");
+    }
+  }
+
+  int calls = 0;
+  Tarnik::Ref<Tarnik::System::Stream> lastStream;
+  bool hasError = false;
+  bool isCancelled = false;
+  std::string message;
+
+ private:
+  class Token {
+   public:
+    explicit Token(std::shared_ptr<std::promise<void>> gone) : gone_(std::move(gone)) {}
+    Token(const Token&) = delete;
+    Token& operator=(const Token&) = delete;
+    ~Token() { gone_->set_value(); }
+
+   private:
+    std::shared_ptr<std::promise<void>> gone_;
+  };
+
+  std::shared_ptr<std::promise<void>> gone_ = std::make_shared<std::promise<void>>();
+  std::future<void> future_ = gone_->get_future();
+};
+
+}  // namespace SsoClient::Testing
+
+#endif

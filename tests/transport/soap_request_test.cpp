@@ -1,0 +1,28 @@
+#include "transport/soap_request.h"
+
+#include <gmock/gmock.h>
+
+#include <algorithm>
+#include <array>
+#include <new>
+#include <string>
+
+namespace SsoClient {
+namespace {
+
+TEST(SoapRequestTest, CleansesItsBodyWhenItDies) {
+  const std::string secret = "hunter2-secret";  // short enough to stand in the string object itself
+  alignas(SoapRequest) std::array<unsigned char, sizeof(SoapRequest)> storage{};
+  auto* request = new (storage.data()) SoapRequest();
+  request->body = secret;
+  const auto holdsSecret = [&] {
+    return std::search(storage.begin(), storage.end(), secret.begin(), secret.end()) !=
+           storage.end();
+  };
+  EXPECT_TRUE(holdsSecret());
+  request->~SoapRequest();
+  EXPECT_FALSE(holdsSecret());
+}
+
+}  // namespace
+}  // namespace SsoClient

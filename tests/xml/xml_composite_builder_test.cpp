@@ -1,0 +1,93 @@
+#include "xml/xml_composite_builder.h"
+
+#include <gmock/gmock.h>
+
+#include <stdexcept>
+
+#include "support/vtable_slot.h"
+#include "xml/builder_factories.h"
+#include "xml/built_xml.h"
+
+namespace SsoClient {
+namespace {
+
+TEST(XMLCompositeBuilderTest, WithoutChildrenItBuildsExactlyItsRoot) {
+  const XMLCompositeBuilder builder(MakeTextElementBuilder("a", "E", "text", {{"b", "c"}}));
+  EXPECT_EQ(Testing::BuiltXml(builder), R"(<a:E b="c">text</a:E>)");
+}
+
+TEST(XMLCompositeBuilderTest, ChildrenFollowTheRootsOwnInTheOrderOfTheirAddition) {
+  XMLCompositeBuilder builder(MakeTextElementBuilder("", "Root", "text"));
+  builder.Add(MakeTextElementBuilder("", "Second", "2"))
+      .Add(MakeTextElementBuilder("", "First", "1"));
+  EXPECT_EQ(Testing::BuiltXml(builder), "<Root>text<Second>2</Second><First>1</First></Root>");
+}
+
+TEST(XMLCompositeBuilderTest, AddingNothingLeavesTheChildrenAndReturnsTheComposite) {
+  XMLCompositeBuilder builder(MakeElementBuilder("", "Root"));
+  builder.Add(MakeTextElementBuilder("", "A", "1"));
+  const auto before = Testing::BuiltXml(builder);
+  EXPECT_EQ(&builder.Add(nullptr), &builder);
+  EXPECT_EQ(Testing::BuiltXml(builder), before);
+  EXPECT_EQ(&builder.Add(MakeTextElementBuilder("", "B", "2")), &builder);
+  EXPECT_EQ(Testing::BuiltXml(builder), "<Root><A>1</A><B>2</B></Root>");
+}
+
+TEST(XMLCompositeBuilderTest, SharesItsRootAndChildrenWithOtherParents) {
+  const auto shared = MakeCompositeBuilder("", "Shared");
+  XMLCompositeBuilder first(shared);
+  first.Add(MakeTextElementBuilder("", "A", "1"));
+  XMLCompositeBuilder second(MakeElementBuilder("", "Parent"));
+  second.Add(shared).Add(shared);
+  shared->Add(MakeTextElementBuilder("", "B", "2"));
+  EXPECT_EQ(Testing::BuiltXml(first), "<Shared><B>2</B><A>1</A></Shared>");
+  EXPECT_EQ(Testing::BuiltXml(second),
+            "<Parent><Shared><B>2</B></Shared><Shared><B>2</B></Shared></Parent>");
+}
+
+TEST(XMLCompositeBuilderTest, MayBeBuiltAnyNumberOfTimes) {
+  XMLCompositeBuilder builder(MakeElementBuilder("", "Root"));
+  builder.Add(MakeTextElementBuilder("", "A", "1"));
+  const auto first = Testing::Built(builder);
+  const auto second = Testing::Built(builder);
+  EXPECT_NE(first, second);
+  EXPECT_EQ(Testing::XmlText(first.get()), Testing::XmlText(second.get()));
+}
+
+class FailingBuilder final : public XMLBaseBuilder {
+ public:
+  void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>&) const override {
+    throw std::runtime_error("no element today");
+  }
+};
+
+TEST(XMLCompositeBuilderTest, FailuresOfAChildPassUnchanged) {
+  XMLCompositeBuilder builder(MakeElementBuilder("", "Root"));
+  builder.Add(std::make_shared<FailingBuilder>());
+  EXPECT_THROW(Testing::Built(builder), std::runtime_error);
+}
+
+TEST(XMLBaseBuilderTest, BuildStandsFirstAndTheDestructorFollows) {
+  const auto builder = MakeTextElementBuilder("a", "E", "text");
+  using BuildFunction = void(const void*, Tarnik::Ref<Tarnik::Xml::ElementNode>&);
+  Tarnik::Ref<Tarnik::Xml::ElementNode> out;
+  TestSupport::VtableSlot<BuildFunction>(builder.get(), 0)(builder.get(), out);
+  EXPECT_EQ(Testing::XmlText(out.get()), "<a:E>text</a:E>");
+
+  class Counting final : public XMLBaseBuilder {
+   public:
+    explicit Counting(int& deaths) : deaths_(deaths) {}
+    ~Counting() override { ++deaths_; }
+    void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>&) const override {}
+
+   private:
+    int& deaths_;
+  };
+  int deaths = 0;
+  auto* counting = new Counting(deaths);
+  TestSupport::VtableSlot<void(const void*)>(counting, 2)(counting);  // 1: complete, 2: deleting
+  EXPECT_EQ(deaths, 1);
+}
+
+}  // namespace
+}  // namespace SsoClient
