@@ -49,7 +49,7 @@ TEST(ResponseElementsTest, CanonicalTextCarriesTheNamespacesThatAreInherited) {
   const auto document =
       Testing::ParseXml(R"(<r xmlns="urn:d" xmlns:q="urn:q" xml:lang="en"><a z="1" b='2'/></r>)");
   EXPECT_EQ(CanonicalizeElement(document->RootElement()->FirstChildElement("a")),
-            R"(<a xmlns="urn:d" xmlns:q="urn:q" b="2" xml:lang="en" z="1"></a>)");
+            R"(<a xmlns="urn:d" xmlns:q="urn:q" b="2" z="1" xml:lang="en"></a>)");
   EXPECT_EQ(CanonicalizeElement(nullptr), "");
 }
 
