@@ -12,9 +12,11 @@ namespace Tarnik::Http {
 /// IPv4 address, or an IPv6 address without its brackets; `port` is the one written or 80 or 443;
 /// `path` is the request target: path and query, "/" if the URL has none.
 ///
-/// Throws `InvalidArgumentException`, naming the fault, for another scheme, a missing or malformed
-/// host, a port outside 1 to 65535, user information, a fragment, blanks, control characters or
-/// non-ASCII bytes, and malformed percent escapes; the outputs are then unchanged.
+/// Throws `InvalidArgumentException`, naming the fault but not the URL, for another scheme, a
+/// missing or malformed host (a name that a resolver would take for a number included), a port
+/// outside 1 to 65535, user information, a fragment, blanks, control characters or non-ASCII bytes,
+/// characters that must be percent-encoded, and malformed percent escapes; the outputs are then
+/// unchanged.
 TARNIK_EXPORT void ParseHttpURL(std::string_view url, bool& isHttps, std::string& host, int& port,
                                 std::string& path);
 
