@@ -1,0 +1,68 @@
+#ifndef TARNIK_HTTP_SENSITIVE_TEXT_H
+#define TARNIK_HTTP_SENSITIVE_TEXT_H
+
+#include <algorithm>
+#include <string>
+#include <string_view>
+
+#include <tarnik/text/string_util.h>
+
+namespace Tarnik::Http {
+
+/// Bytes that may hold passwords or tokens: no copy is left behind in memory, neither when the text
+/// dies nor when it outgrows its buffer.
+class SensitiveText {
+ public:
+  SensitiveText() = default;
+  SensitiveText(const SensitiveText&) = delete;
+  SensitiveText& operator=(const SensitiveText&) = delete;
+  ~SensitiveText() { Clear(); }
+
+  void Reserve(std::size_t capacity) {
+    if (capacity <= text_.capacity()) {
+      return;
+    }
+    std::string larger;
+    larger.reserve(capacity);
+    larger.assign(text_);
+    text_.swap(larger);
+    StringUtil::Cleanse(larger);
+  }
+
+  void Append(std::string_view more) {
+    if (text_.capacity() - text_.size() < more.size()) {
+      Reserve(std::max(text_.size() + more.size(), 2 * text_.capacity()));
+    }
+    text_.append(more);
+  }
+
+  /// Drops the first `count` bytes; the others move to the front.
+  void RemovePrefix(std::size_t count) {
+    if (count == text_.size()) {
+      Clear();
+      return;
+    }
+    std::string rest(text_, count);
+    text_.swap(rest);
+    StringUtil::Cleanse(rest);
+  }
+
+  void Clear() noexcept { StringUtil::Cleanse(text_); }
+
+  /// Hands the bytes over to an owner who cleanses them.
+  std::string Take() noexcept {
+    std::string taken;
+    taken.swap(text_);
+    return taken;
+  }
+
+  const std::string& Text() const noexcept { return text_; }
+  std::size_t Size() const noexcept { return text_.size(); }
+
+ private:
+  std::string text_;
+};
+
+}  // namespace Tarnik::Http
+
+#endif
