@@ -1,0 +1,95 @@
+#include "http/connection.h"
+
+#include <utility>
+
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/system/thread_pool.h>
+#include <tarnik/text/string_util.h>
+
+namespace Tarnik::Http {
+namespace {
+
+constexpr std::size_t kReadBytes = std::size_t{16} * 1024;
+
+}  // namespace
+
+Connection::Connection(Ref<System::Stream> stream)
+    : stream_(std::move(stream)),
+      isSecure_(dynamic_cast<Ssl::SSLStream*>(stream_.get()) != nullptr) {}
+
+Connection::~Connection() {
+  stream_->Close();
+  StringUtil::Cleanse(buffer_);
+}
+
+void Connection::Read(ReadHandler handler) {
+  std::unique_lock lock(mutex_);
+  if (early_ != nullptr) {
+    lock.unlock();
+    DeliverEarly(std::move(handler));
+    return;
+  }
+  handler_ = std::move(handler);
+  if (std::exchange(isReading_, true)) {
+    return;
+  }
+  lock.unlock();
+  StartRead();
+}
+
+// The result waits for a thread of its own, as a stream's would: a handler is never run inside the
+// call that it was handed to.
+void Connection::DeliverEarly(ReadHandler handler) {
+  System::GetThreadPool()->Post([self = Ref<Connection>(this), handler = std::move(handler)] {
+    const std::unique_ptr<EarlyResult> early = std::move(self->early_);
+    handler({self->buffer_.data(), early->size},
+            dynamic_cast<const Exception*>(early->error.get()));
+  });
+}
+
+void Connection::StartRead() {
+  buffer_.resize(kReadBytes);
+  stream_->ReadAsync(buffer_.data(), buffer_.size(),
+                     [self = Ref<Connection>(this)](std::size_t size, const Exception* error) {
+                       self->OnRead(size, error);
+                     });
+}
+
+void Connection::OnRead(std::size_t size, const Exception* error) {
+  ReadHandler handler;
+  {
+    const std::lock_guard guard(mutex_);
+    isReading_ = false;
+    handler.swap(handler_);
+    if (!handler) {
+      early_ = std::make_unique<EarlyResult>();
+      early_->size = size;
+      early_->error = error == nullptr ? nullptr : error->Clone();
+      return;
+    }
+  }
+  handler({buffer_.data(), size}, error);
+}
+
+void Connection::Write(std::string_view data, System::Stream::WriteCompletion completion) {
+  stream_->WriteAsync(data.data(), data.size(), std::move(completion));
+}
+
+void Connection::Close() noexcept {
+  stream_->Close();
+}
+
+void Connection::Watch(std::function<void()> onLost) {
+  // What the last exchange read need not lie here while nobody uses it.
+  StringUtil::Cleanse(buffer_);
+  Read([onLost = std::move(onLost)](std::string_view, const Exception*) { onLost(); });
+}
+
+bool Connection::Claim() {
+  ReadHandler watch;
+  const std::lock_guard guard(mutex_);
+  watch.swap(handler_);
+  return isReading_;
+}
+
+}  // namespace Tarnik::Http

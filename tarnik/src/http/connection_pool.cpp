@@ -1,0 +1,101 @@
+#include "http/connection_pool.h"
+
+#include <algorithm>
+#include <optional>
+#include <utility>
+
+#include <tarnik/system/thread_pool.h>
+
+namespace Tarnik::Http {
+
+IdleConnections::~IdleConnections() {
+  for (const Entry& entry : entries_) {
+    Discard(entry);
+  }
+}
+
+void IdleConnections::Discard(const Entry& entry) noexcept {
+  entry.expiry->Cancel();
+  entry.connection->Close();
+}
+
+Ref<Connection> IdleConnections::Take(const Place& place) {
+  while (true) {
+    std::optional<Entry> entry;
+    {
+      const std::lock_guard guard(mutex_);
+      const auto last = std::find_if(entries_.rbegin(), entries_.rend(),
+                                     [&](const Entry& each) { return each.place == place; });
+      if (last == entries_.rend()) {
+        return nullptr;
+      }
+      entry = std::move(*last);
+      entries_.erase(std::next(last).base());
+    }
+    entry->expiry->Cancel();
+    if (entry->connection->Claim()) {
+      return entry->connection;
+    }
+    entry->connection->Close();
+  }
+}
+
+void IdleConnections::Put(const Place& place, Ref<Connection> connection) {
+  const std::uint64_t id = NextId();
+  const auto drop = [weak = weak_from_this(), id] {
+    if (const auto self = weak.lock()) {
+      self->Drop(id);
+    }
+  };
+  // Watched before it can be taken: a connection that nobody watches counts as lost.
+  connection->Watch(drop);
+  Entry entry{id, place, std::move(connection),
+              System::GetThreadPool()->RunAfter(kMaxIdleMicroseconds, drop)};
+  std::optional<Entry> superfluous;
+  {
+    const std::lock_guard guard(mutex_);
+    if (const auto old = Superfluous(place); old != entries_.end()) {
+      superfluous = std::move(*old);
+      entries_.erase(old);
+    }
+    entries_.push_back(std::move(entry));
+  }
+  if (superfluous) {
+    Discard(*superfluous);
+  }
+}
+
+std::uint64_t IdleConnections::NextId() {
+  const std::lock_guard guard(mutex_);
+  return ++lastId_;
+}
+
+std::vector<IdleConnections::Entry>::iterator IdleConnections::Superfluous(const Place& place) {
+  const auto isHere = [&](const Entry& entry) { return entry.place == place; };
+  const auto here = std::count_if(entries_.begin(), entries_.end(), isHere);
+  if (static_cast<std::size_t>(here) >= kMaxIdlePerPlace) {
+    return std::find_if(entries_.begin(), entries_.end(), isHere);
+  }
+  return entries_.size() >= kMaxIdle ? entries_.begin() : entries_.end();
+}
+
+void IdleConnections::Drop(std::uint64_t id) {
+  std::optional<Entry> entry;
+  {
+    const std::lock_guard guard(mutex_);
+    const auto found = std::find_if(entries_.begin(), entries_.end(),
+                                    [&](const Entry& each) { return each.id == id; });
+    if (found == entries_.end()) {
+      return;
+    }
+    entry = std::move(*found);
+    entries_.erase(found);
+  }
+  Discard(*entry);
+}
+
+Ref<ConnectionPool> CreateConnectionPool() {
+  return MakeRef<ConnectionPoolImpl>();
+}
+
+}  // namespace Tarnik::Http
