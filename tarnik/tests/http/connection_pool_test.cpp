@@ -1,0 +1,220 @@
+#include "http/connection_pool.h"
+
+#include "http/exchange_fixture.h"
+
+namespace Tarnik::Http {
+namespace {
+
+class ConnectionPoolTest : public ExchangeFixture {
+ protected:
+  /// Runs `count` exchanges at once, so that each has a connection of its own, and then ends them.
+  void ExchangeAtOnce(std::size_t count) {
+    const std::size_t before = spec_->Streams().size();
+    std::vector<Ref<PendingRequestItem>> items;
+    for (std::size_t i = 0; i < count; ++i) {
+      items.push_back(Send());
+    }
+    ASSERT_TRUE(Eventually([&] { return spec_->Streams().size() == before + count; }));
+    for (const auto& stream : spec_->Streams()) {
+      stream->Push(kHello);
+    }
+    for (const auto& item : items) {
+      agent_->Wait(item.get(), kPlentyOfTime);
+    }
+  }
+
+  std::size_t OpenCount() {
+    const auto streams = spec_->Streams();
+    return static_cast<std::size_t>(std::count_if(
+        streams.begin(), streams.end(), [](const auto& stream) { return !stream->IsClosed(); }));
+  }
+};
+
+TEST_F(ConnectionPoolTest, ReusesAConnection) {
+  UseAnswer(kHello);
+  for (int i = 0; i < 20; ++i) {
+    EXPECT_EQ(Exchanged(), "hello");
+  }
+  EXPECT_EQ(spec_->ConnectCount(), 1U);
+}
+
+TEST_F(ConnectionPoolTest, ReusesAConnectionFromWithinTheCompletion) {
+  UseAnswer(kHello);
+  const auto inner = std::make_shared<Heard>();
+  const auto item = agent_->SendAsync(
+      PostRequest().get(), [&](Exception*, ClientResponse*, PendingRequestItem*) { Send(inner); },
+      0);
+  agent_->Wait(item.get(), kPlentyOfTime);
+  EXPECT_TRUE(Eventually([&] { return inner->count == 1; }));
+  EXPECT_EQ(inner->body, "hello");
+  EXPECT_EQ(spec_->ConnectCount(), 1U);
+}
+
+class SingleUseAnswerTest : public ConnectionPoolTest,
+                            public testing::WithParamInterface<const char*> {};
+
+TEST_P(SingleUseAnswerTest, IsTheLastOfItsConnection) {
+  ScriptedSpec::Script script;
+  script.stream.onWritten = [](ScriptedStream& stream) {
+    stream.Push(GetParam());
+    stream.PushEnd();
+  };
+  Use(script);
+  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(spec_->ConnectCount(), 2U);
+  EXPECT_EQ(OpenCount(), 0U);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    ConnectionPool, SingleUseAnswerTest,
+    testing::Values("HTTP/1.1 200 OK\r\nConnection: close\r\nContent-Length: 5\r\n\r\nhello",
+                    "HTTP/1.0 200 OK\r\nContent-Length: 5\r\n\r\nhello",
+                    "HTTP/1.1 200 OK\r\n\r\nhello",
+                    "HTTP/1.1 200 OK\r\nContent-Length: 5\r\n\r\nhelloHTTP/1.1 200 OK\r\n"));
+
+TEST_F(ConnectionPoolTest, DropsAnIdleConnectionThatThePeerCloses) {
+  UseAnswer(kHello);
+  Exchanged();
+  const auto stream = spec_->Streams().front();
+  stream->PushEnd();
+  EXPECT_TRUE(Eventually([&] { return stream->IsClosed(); }));
+  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(spec_->ConnectCount(), 2U);
+}
+
+TEST_F(ConnectionPoolTest, DropsAnIdleConnectionThatFails) {
+  UseAnswer(kHello);
+  Exchanged();
+  const auto stream = spec_->Streams().front();
+  stream->PushError("Connection reset by peer");
+  EXPECT_TRUE(Eventually([&] { return stream->IsClosed(); }));
+}
+
+TEST_F(ConnectionPoolTest, DropsAnIdleConnectionWithAnAnswerThatNobodyAskedFor) {
+  UseAnswer(kHello);
+  Exchanged();
+  const auto stream = spec_->Streams().front();
+  stream->Push("HTTP/1.1 200 OK\r\nContent-Length: 4\r\n\r\nevil");
+  EXPECT_TRUE(Eventually([&] { return stream->IsClosed(); }));
+  EXPECT_EQ(Exchanged(), "hello");
+}
+
+TEST_F(ConnectionPoolTest, NeverSendsARequestTwice) {
+  ScriptedSpec::Script script;
+  script.stream.onWritten = [](ScriptedStream& stream) {
+    const std::string written = stream.Written();
+    if (written.find("POST", 1) == std::string::npos) {
+      stream.Push(kHello);
+      return;
+    }
+    stream.PushEnd();
+  };
+  Use(script);
+  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(Exchanged(), "sts.example:443 closed the connection without an answer.");
+  EXPECT_EQ(spec_->ConnectCount(), 1U);
+}
+
+TEST_F(ConnectionPoolTest, ClosesIdleConnectionsWithTheAgent) {
+  UseAnswer(kHello);
+  Exchanged();
+  const auto stream = spec_->Streams().front();
+  EXPECT_FALSE(stream->IsClosed());
+  agent_ = nullptr;
+  EXPECT_TRUE(stream->IsClosed());
+}
+
+TEST_F(ConnectionPoolTest, ClosesAConnectionThatIsFreeAfterTheAgentHasDied) {
+  Use({});
+  const auto heard = std::make_shared<Heard>();
+  const auto item = Send(heard);
+  ASSERT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
+  agent_ = nullptr;
+  spec_->Streams().front()->Push(kHello);
+  EXPECT_TRUE(Eventually([&] { return heard->count == 1; }));
+  EXPECT_EQ(heard->body, "hello");
+  EXPECT_TRUE(spec_->Streams().front()->IsClosed());
+}
+
+TEST_F(ConnectionPoolTest, KeepsEightIdleConnectionsToAPlace) {
+  Use({});
+  ExchangeAtOnce(12);
+  EXPECT_EQ(OpenCount(), kMaxIdlePerPlace);
+}
+
+TEST_F(ConnectionPoolTest, KeepsSixtyFourIdleConnectionsInAll) {
+  const auto pool = CreateConnectionPool();
+  std::vector<Ref<ScriptedSpec>> specs;
+  for (int i = 0; i < 9; ++i) {
+    Use({}, nullptr, pool.get());
+    specs.push_back(spec_);
+    ExchangeAtOnce(8);
+  }
+  std::size_t open = 0;
+  for (const auto& spec : specs) {
+    spec_ = spec;
+    open += OpenCount();
+  }
+  EXPECT_EQ(open, kMaxIdle);
+}
+
+TEST_F(ConnectionPoolTest, IsSharedByAgentsOfOneSpec) {
+  const auto pool = CreateConnectionPool();
+  ScriptedSpec::Script script;
+  script.stream.onWritten = AnswerWith(kHello);
+  Use(script, nullptr, pool.get());
+  Exchanged();
+  agent_ = CreateHttpUserAgent(spec_.get(), nullptr, pool.get());
+  Exchanged();
+  EXPECT_EQ(spec_->ConnectCount(), 1U);
+}
+
+TEST_F(ConnectionPoolTest, KeepsConnectionsOfOtherSpecsApart) {
+  const auto pool = CreateConnectionPool();
+  ScriptedSpec::Script script;
+  script.stream.onWritten = AnswerWith(kHello);
+  Use(script, nullptr, pool.get());
+  Exchanged();
+  // The same endpoint, but perhaps another trust.
+  Use(script, nullptr, pool.get());
+  Exchanged();
+  EXPECT_EQ(spec_->ConnectCount(), 1U);
+}
+
+TEST_F(ConnectionPoolTest, ClosesAConnectionThatIsIdleForTooLong) {
+  UseAnswer(kHello);
+  Exchanged();
+  const auto stream = spec_->Streams().front();
+  EXPECT_FALSE(stream->IsClosed());
+  EXPECT_TRUE(Eventually([&] {
+    std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    return stream->IsClosed();
+  }));
+}
+
+TEST(ConnectionPoolConcurrencyTest, ServesManyThreads) {
+  ScriptedSpec::Script script;
+  script.stream.onWritten = AnswerWith(kHello);
+  const auto spec = MakeRef<ScriptedSpec>(script);
+  const auto agent = CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+  std::atomic<int> answered{0};
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 8; ++t) {
+    threads.emplace_back([&] {
+      for (int i = 0; i < 50; ++i) {
+        const auto item =
+            agent->SendAsync(PostRequest().get(), Hear(std::make_shared<Heard>()), kPlentyOfTime);
+        answered += agent->Wait(item.get(), kPlentyOfTime)->Status().code == 200 ? 1 : 0;
+      }
+    });
+  }
+  for (std::thread& thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(answered, 400);
+  EXPECT_LE(spec->ConnectCount(), 8U);
+}
+
+}  // namespace
+}  // namespace Tarnik::Http

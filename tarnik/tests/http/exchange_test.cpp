@@ -1,0 +1,372 @@
+#include "http/exchange.h"
+
+#include "http/exchange_fixture.h"
+
+namespace Tarnik::Http {
+namespace {
+
+class ExchangeTest : public ExchangeFixture {};
+
+constexpr const char* kChunkedHello =
+    "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n5\r\nhello\r\n0\r\n\r\n";
+
+TEST_F(ExchangeTest, HandsTheAnswerToCompletionAndWaiter) {
+  UseAnswer("HTTP/1.1 500 Internal Server Error\r\nX: y\r\nContent-Length: 5\r\n\r\nfault");
+  const auto heard = std::make_shared<Heard>();
+  const auto item = Send(heard);
+  const auto response = agent_->Wait(item.get(), kPlentyOfTime);
+  EXPECT_EQ(response->Status().code, 500);
+  EXPECT_EQ(response->Status().reason, "Internal Server Error");
+  EXPECT_EQ(response->Header("x"), "y");
+  EXPECT_EQ(heard->body, "fault");
+  EXPECT_EQ(heard->count, 1);
+  EXPECT_EQ(agent_->Wait(item.get(), 0), response);
+}
+
+TEST_F(ExchangeTest, ReadsAnAnswerInPiecesOfAnySize) {
+  for (const std::size_t pieceSize : {1, 2, 5, 1000}) {
+    for (const char* answer : {kHello, kChunkedHello}) {
+      ScriptedSpec::Script script;
+      script.stream.pieceSize = pieceSize;
+      script.stream.onWritten = AnswerWith(answer);
+      Use(script);
+      EXPECT_EQ(Exchanged(), "hello");
+    }
+  }
+}
+
+TEST_F(ExchangeTest, FollowsNoRedirect) {
+  for (int code = 300; code < 400; ++code) {
+    UseAnswer("HTTP/1.1 " + std::to_string(code) +
+              " Moved\r\nLocation: http://evil.example/\r\nConnection: close\r\nContent-Length: "
+              "0\r\n\r\n");
+    const auto item = Send();
+    EXPECT_EQ(agent_->Wait(item.get(), kPlentyOfTime)->Status().code, code);
+    EXPECT_EQ(spec_->ConnectCount(), 1U);
+  }
+}
+
+TEST_F(ExchangeTest, ReportsAFailedConnectAndDropsItsStream) {
+  ScriptedSpec::Script script;
+  script.connectError = "Cannot connect to sts.example:443: Connection refused";
+  Use(script);
+  EXPECT_EQ(Exchanged(), "Cannot connect to sts.example:443: Connection refused");
+}
+
+TEST_F(ExchangeTest, ReportsAConnectThatGaveNoStream) {
+  ScriptedSpec::Script script;
+  script.givesNoStream = true;
+  Use(script);
+  EXPECT_EQ(Exchanged(), "The connection to sts.example:443 was opened without a stream.");
+}
+
+TEST_F(ExchangeTest, ThrowsWhatTheSpecThrowsAndNeverCompletes) {
+  ScriptedSpec::Script script;
+  script.startError = "bad host";
+  Use(script);
+  const auto heard = std::make_shared<Heard>();
+  EXPECT_THROW(Send(heard, kSecond / 1000), InvalidArgumentException);
+  EXPECT_TRUE(Eventually([&] { return heard.use_count() == 1; }));
+  EXPECT_EQ(heard->count, 0);
+}
+
+TEST_F(ExchangeTest, ReportsAWriteThatFailsAtAnyByte) {
+  UseAnswer(kHello);
+  Exchanged();
+  const std::size_t size = spec_->Streams().front()->Written().size();
+  for (std::size_t at = 0; at < size; ++at) {
+    ScriptedSpec::Script script;
+    script.stream.failWriteAt = at;
+    script.stream.onWritten = AnswerWith(kHello);
+    Use(script);
+    EXPECT_EQ(Exchanged(), "The write failed.") << at;
+    EXPECT_TRUE(spec_->Streams().front()->IsClosed());
+  }
+}
+
+TEST_F(ExchangeTest, NeverTakesAnAnswerThatEndsAtAnyByteForAWholeOne) {
+  for (const std::string answer : {kHello, kChunkedHello}) {
+    for (std::size_t size = 0; size < answer.size(); ++size) {
+      ScriptedSpec::Script script;
+      script.stream.onWritten = [&](ScriptedStream& stream) {
+        stream.Push(answer.substr(0, size));
+        stream.PushEnd();
+      };
+      Use(script);
+      const std::string result = Exchanged();
+      const std::size_t headSize = answer.find("\r\n\r\n") + 4;
+      const std::string expected =
+          size == 0         ? "sts.example:443 closed the connection without an answer."
+          : size < headSize ? "The answer from sts.example:443 was cut off in its header."
+                            : "The answer from sts.example:443 was cut off in its body.";
+      EXPECT_EQ(result, expected) << size;
+      EXPECT_TRUE(spec_->Streams().front()->IsClosed());
+    }
+  }
+}
+
+TEST_F(ExchangeTest, NeverTakesAnAnswerThatFailsAtAnyByteForAWholeOne) {
+  const std::string untilEnd = "HTTP/1.1 200 OK\r\n\r\nhello";
+  for (const std::string& answer : {std::string(kHello), std::string(kChunkedHello), untilEnd}) {
+    const std::size_t end = answer == untilEnd ? answer.size() + 1 : answer.size();
+    for (std::size_t size = 0; size < end; ++size) {
+      ScriptedSpec::Script script;
+      script.stream.onWritten = [&](ScriptedStream& stream) {
+        stream.Push(answer.substr(0, size));
+        stream.PushError("Connection reset by peer");
+      };
+      Use(script);
+      EXPECT_EQ(Exchanged(), "Connection reset by peer") << size;
+      EXPECT_TRUE(spec_->Streams().front()->IsClosed());
+    }
+  }
+}
+
+TEST_F(ExchangeTest, TakesTheEndForTheEndOfABodyWithoutLength) {
+  ScriptedSpec::Script script;
+  script.stream.onWritten = [](ScriptedStream& stream) {
+    stream.Push("HTTP/1.0 200 OK\r\n\r\nhello");
+    stream.PushEnd();
+  };
+  Use(script);
+  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_TRUE(spec_->Streams().front()->IsClosed());
+}
+
+TEST_F(ExchangeTest, RefusesAMalformedAnswerAndCloses) {
+  UseAnswer("HTTP/1.1 200 OK\r\nContent-Length: +5\r\n\r\nhello");
+  EXPECT_EQ(Exchanged(), "The answer from sts.example:443 has a malformed Content-Length.");
+  EXPECT_TRUE(spec_->Streams().front()->IsClosed());
+}
+
+TEST_F(ExchangeTest, KeepsTheClassOfAFailure) {
+  UseAnswer("junk");
+  const auto item = Send();
+  EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), HttpException);
+}
+
+TEST_F(ExchangeTest, TakesAnEarlyAnswerThatClosesBeforeTheRequestIsWritten) {
+  ScriptedSpec::Script script;
+  script.stream.holdWrites = true;
+  Use(script);
+  const auto item = Send();
+  ASSERT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
+  spec_->Streams().front()->Push(
+      "HTTP/1.1 413 Too Large\r\nConnection: close\r\nContent-Length: 0\r\n\r\n");
+  EXPECT_EQ(agent_->Wait(item.get(), kPlentyOfTime)->Status().code, 413);
+  EXPECT_TRUE(spec_->Streams().front()->IsClosed());
+}
+
+TEST_F(ExchangeTest, WaitsForItsWriteBeforeAKeptConnectionIsGivenOn) {
+  ScriptedSpec::Script script;
+  script.stream.holdWrites = true;
+  Use(script);
+  const auto heard = std::make_shared<Heard>();
+  const auto item = Send(heard);
+  ASSERT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
+  const auto stream = spec_->Streams().front();
+  ASSERT_TRUE(Eventually([&] { return !stream->Written().empty(); }));
+  stream->Push(kHello);
+  stream->ReleaseWrite();
+  EXPECT_EQ(BodyOf(*agent_->Wait(item.get(), kPlentyOfTime)), "");
+  EXPECT_EQ(heard->body, "hello");
+  EXPECT_FALSE(stream->IsClosed());
+}
+
+enum class Stage { kConnect, kWrite, kHead, kBody };
+
+class StalledExchangeTest : public ExchangeFixture, public testing::WithParamInterface<Stage> {
+ protected:
+  void SetUp() override {
+    ScriptedSpec::Script script;
+    script.holdConnects = GetParam() == Stage::kConnect;
+    script.stream.holdWrites = GetParam() == Stage::kWrite;
+    script.stream.onWritten = [](ScriptedStream& stream) {
+      stream.Push(GetParam() == Stage::kHead ? "HTTP/1.1 200 OK\r\nCont"
+                                             : "HTTP/1.1 200 OK\r\nContent-Length: 5\r\n\r\nhel");
+    };
+    Use(script);
+  }
+
+  /// Waits until the exchange has come as far as it will.
+  bool IsStalled() {
+    if (GetParam() == Stage::kConnect) {
+      return spec_->ConnectCount() == 1;
+    }
+    return Eventually([&] { return !spec_->Streams().empty(); }) &&
+           Eventually([&] { return !spec_->Streams().front()->Written().empty(); });
+  }
+
+  void ExpectReleased() {
+    if (GetParam() == Stage::kConnect) {
+      EXPECT_EQ(spec_->CancelCount(), 1U);
+      return;
+    }
+    EXPECT_TRUE(spec_->Streams().front()->IsClosed());
+  }
+};
+
+TEST_P(StalledExchangeTest, EndsOnceByCancel) {
+  const auto heard = std::make_shared<Heard>();
+  const auto item = Send(heard);
+  ASSERT_TRUE(IsStalled());
+  EXPECT_TRUE(item->Cancel());
+  EXPECT_FALSE(item->Cancel());
+  EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), CancelledException);
+  EXPECT_EQ(heard->message, "The request to sts.example:443 was cancelled.");
+  ExpectReleased();
+  EXPECT_TRUE(Eventually([&] { return heard.use_count() == 1; }));
+  EXPECT_EQ(heard->count, 1);
+}
+
+TEST_P(StalledExchangeTest, EndsOnceByItsOwnTimeLimit) {
+  const auto heard = std::make_shared<Heard>();
+  const auto item = Send(heard, 20000);
+  EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), TimeoutException);
+  EXPECT_EQ(heard->message, "No answer from sts.example:443 within 20 milliseconds.");
+  EXPECT_TRUE(Eventually([&] { return heard.use_count() == 1; }));
+  EXPECT_EQ(heard->count, 1);
+}
+
+TEST_P(StalledExchangeTest, EndsOnceByTheWaitersTimeLimit) {
+  const auto heard = std::make_shared<Heard>();
+  const auto item = Send(heard);
+  ASSERT_TRUE(IsStalled());
+  EXPECT_THROW(agent_->Wait(item.get(), 1500), TimeoutException);
+  EXPECT_EQ(heard->count, 1);
+  EXPECT_EQ(heard->message, "No answer from sts.example:443 within 1500 microseconds.");
+  ExpectReleased();
+  EXPECT_FALSE(item->Cancel());
+}
+
+TEST_P(StalledExchangeTest, OutlivesItsAgentAndItsHandle) {
+  const auto heard = std::make_shared<Heard>();
+  auto item = Send(heard, 20000);
+  agent_ = nullptr;
+  item = nullptr;
+  EXPECT_TRUE(Eventually([&] { return heard->count == 1; }));
+  EXPECT_TRUE(Eventually([&] { return heard.use_count() == 1; }));
+}
+
+INSTANTIATE_TEST_SUITE_P(Exchange, StalledExchangeTest,
+                         testing::Values(Stage::kConnect, Stage::kWrite, Stage::kHead,
+                                         Stage::kBody));
+
+TEST_F(ExchangeTest, HoldsItsTimeLimitAgainstAByteNowAndThen) {
+  ScriptedSpec::Script script;
+  script.stream.onWritten = AnswerWith("HTTP/1.1 200 OK\r\n");
+  Use(script);
+  const auto item = Send(std::make_shared<Heard>(), 50000);
+  ASSERT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
+  const auto stream = spec_->Streams().front();
+  std::atomic<bool> isOver{false};
+  std::thread dribble([&] {
+    while (!isOver) {
+      stream->Push("x");
+      std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    }
+  });
+  EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), TimeoutException);
+  isOver = true;
+  dribble.join();
+}
+
+TEST_F(ExchangeTest, ClosesAStreamThatIsConnectedAfterTheEnd) {
+  ScriptedSpec::Script script;
+  script.holdConnects = true;
+  Use(script);
+  const auto first = Send();
+  // A spec whose item cannot stop its connect any more.
+  spec_->ReleaseConnect();
+  first->Cancel();
+  EXPECT_THROW(agent_->Wait(first.get(), kPlentyOfTime), CancelledException);
+  EXPECT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
+  const auto stream = spec_->Streams().front();
+  EXPECT_TRUE(Eventually([&] { return stream->IsClosed(); }));
+}
+
+struct DurationCase {
+  unsigned long microseconds;
+  const char* text;
+};
+
+class TimeoutMessageTest : public ExchangeFixture,
+                           public testing::WithParamInterface<DurationCase> {};
+
+TEST_P(TimeoutMessageTest, NamesTheLimit) {
+  ScriptedSpec::Script script;
+  script.holdConnects = true;
+  Use(script);
+  const auto heard = std::make_shared<Heard>();
+  const auto item = Send(heard, GetParam().microseconds);
+  EXPECT_THROW(agent_->Wait(item.get(), 0), TimeoutException);
+  EXPECT_EQ(heard->message,
+            std::string("No answer from sts.example:443 within ") + GetParam().text + ".");
+}
+
+INSTANTIATE_TEST_SUITE_P(Exchange, TimeoutMessageTest,
+                         testing::Values(DurationCase{1, "1 microseconds"},
+                                         DurationCase{1000, "1 milliseconds"},
+                                         DurationCase{1001, "1001 microseconds"},
+                                         DurationCase{1000000, "1 second"}));
+
+TEST_F(ExchangeTest, WaitsForEverWithALimitBeyondTheClock) {
+  UseAnswer(kHello);
+  const auto item = Send();
+  EXPECT_EQ(agent_->Wait(item.get(), ~0UL)->Status().code, 200);
+}
+
+// The completion, the time limit and a cancel meet in every order; one of them wins.
+TEST(ExchangeConcurrencyTest, EndsOnceHoweverEndsRace) {
+  ScriptedSpec::Script script;
+  script.stream.pieceSize = 7;
+  script.stream.onWritten = AnswerWith(kHello);
+  const auto spec = MakeRef<ScriptedSpec>(script);
+  const auto agent = CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+  for (int i = 0; i < 300; ++i) {
+    const auto heard = std::make_shared<Heard>();
+    const auto item = agent->SendAsync(PostRequest().get(), Hear(heard), 1 + i % 40);
+    std::thread canceller([&] { item->Cancel(); });
+    bool hasFailed = false;
+    try {
+      agent->Wait(item.get(), 1 + i % 30);
+    } catch (const IOException&) {
+      hasFailed = true;
+    }
+    canceller.join();
+    EXPECT_EQ(heard->count, 1);
+    EXPECT_EQ(heard->responseCount, hasFailed ? 0 : 1);
+    spec->ForgetStreams();
+  }
+}
+
+TEST(ExchangeConcurrencyTest, CarriesAThousandExchangesAtOnce) {
+  constexpr int kCount = 1000;
+  ScriptedSpec::Script script;
+  const auto spec = MakeRef<ScriptedSpec>(script);
+  const auto agent = CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+  const auto heard = std::make_shared<Heard>();
+  std::atomic<int> answered{0};
+  std::vector<Ref<PendingRequestItem>> items;
+  for (int i = 0; i < kCount; ++i) {
+    items.push_back(agent->SendAsync(
+        PostRequest().get(),
+        [&answered](Exception*, ClientResponse* response, PendingRequestItem*) {
+          answered += response != nullptr && BodyOf(*response) == "hello" ? 1 : 0;
+        },
+        kPlentyOfTime));
+  }
+  // All are under way before the first is answered.
+  ASSERT_TRUE(Eventually([&] { return spec->Streams().size() == kCount; }));
+  EXPECT_EQ(answered, 0);
+  for (const auto& stream : spec->Streams()) {
+    stream->Push(kHello);
+  }
+  for (const auto& item : items) {
+    agent->Wait(item.get(), kPlentyOfTime);
+  }
+  EXPECT_EQ(answered, kCount);
+}
+
+}  // namespace
+}  // namespace Tarnik::Http
