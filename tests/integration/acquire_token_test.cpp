@@ -17,7 +17,7 @@ long Seconds(const Tarnik::System::DateTime& from, const Tarnik::System::DateTim
 TEST_F(AcquireTokenTest, GivesAValidatedBearerTokenOverTls) {
   const auto token = Acquire();
   ASSERT_NE(token, nullptr);
-  EXPECT_EQ(token->Subject(), (PrincipalId{"alice", "example.com"}));
+  EXPECT_EQ(token->Subject(), (PrincipalId{"alice", "EXAMPLE.COM"}));
   EXPECT_EQ(token->ConfirmationType(), BEARER);
   EXPECT_EQ(token->HolderOfKeyCertificate(), nullptr);
   EXPECT_EQ(token->Issuer(), "https://sts.example.com/STS");
@@ -52,7 +52,7 @@ TEST_F(AcquireTokenTest, TokenCarriesNamesAndGroupsOfTheSubject) {
 }
 
 TEST_F(AcquireTokenTest, SolutionUserIsMarked) {
-  const auto token = Service()->AcquireToken("machine@example.com", "machine-secret", TenMinutes());
+  const auto token = Service()->AcquireToken("machine@EXAMPLE.COM", "machine-secret", TenMinutes());
   EXPECT_TRUE(token->IsSolution());
 }
 
@@ -79,12 +79,12 @@ TEST_F(AcquireTokenTest, SpecReachesTheToken) {
 
 TEST_F(AcquireTokenTest, DelegationIsReadBackAsAChain) {
   TokenSpec spec = TenMinutes();
-  spec.delegateTo = std::string("machine@example.com");
+  spec.delegateTo = std::string("machine@EXAMPLE.COM");
   const auto token = Acquire(spec);
   std::vector<Delegate> chain;
   token->GetDelegationChain(chain);
   ASSERT_EQ(chain.size(), 1U);
-  EXPECT_EQ(chain[0].delegate, (PrincipalId{"machine", "example.com"}));
+  EXPECT_EQ(chain[0].delegate, (PrincipalId{"machine", "EXAMPLE.COM"}));
 }
 
 TEST_F(AcquireTokenTest, TokenTravelsInsideAnActAsRequest) {
@@ -93,7 +93,7 @@ TEST_F(AcquireTokenTest, TokenTravelsInsideAnActAsRequest) {
   TokenSpec actAs = TenMinutes();
   actAs.actAsToken = Acquire(delegable);
   Sts().ClearRequests();
-  const auto token = Service()->AcquireToken("machine@example.com", "machine-secret", actAs);
+  const auto token = Service()->AcquireToken("machine@EXAMPLE.COM", "machine-secret", actAs);
   EXPECT_EQ(token->Subject().name, "alice");
   std::vector<Delegate> chain;
   token->GetDelegationChain(chain);

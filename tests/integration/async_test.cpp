@@ -45,7 +45,7 @@ TEST_F(AsyncTest, FailureReachesTheCallbackWithItsExactClass) {
   EXPECT_EQ(outcome.token, nullptr);
   ASSERT_NE(outcome.error, nullptr);
   EXPECT_EQ(typeid(*outcome.error), typeid(InvalidCredentialsException));
-  EXPECT_EQ(typeid(*AcquireAsync(*Service(), "expired@example.com", "expired-secret").get().error),
+  EXPECT_EQ(typeid(*AcquireAsync(*Service(), "expired@EXAMPLE.COM", "expired-secret").get().error),
             typeid(PasswordExpiredException));
   const auto nowhere = MakeService(Sts(), "https://sts.invalid/sts");
   EXPECT_EQ(typeid(*AcquireAsync(*nowhere, kUser, kPassword).get().error),

@@ -22,7 +22,7 @@ int main(int argc, char** argv) {
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 600;
   for (int i = 0; i < 100; ++i) {
-    service->AcquireTokenAsync("alice@example.com", "alice-secret", spec,
+    service->AcquireTokenAsync("alice@EXAMPLE.COM", "secret", spec,
                                [](const auto&, const Tarnik::Exception*) {});
   }
   std::this_thread::sleep_for(std::chrono::microseconds(std::atol(argv[4])));

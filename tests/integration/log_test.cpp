@@ -38,7 +38,7 @@ class LogTest : public StsTest {
 };
 
 constexpr char kRequestLine[] =
-    "Requested token for subject `alice@example.com', spec `TokenSpec [tokenLifetimeSec=600, "
+    "Requested token for subject `alice@EXAMPLE.COM', spec `TokenSpec [tokenLifetimeSec=600, "
     "delegable=false, delegateTo=<unset>, renewable=false, "
     "confirmationType=0,audienceRestriction=, advice=[]'";
 

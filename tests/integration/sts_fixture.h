@@ -11,8 +11,8 @@
 
 namespace SsoClient::Tests {
 
-inline constexpr char kUser[] = "alice@example.com";
-inline constexpr char kPassword[] = "alice-secret";
+inline constexpr char kUser[] = "alice@EXAMPLE.COM";
+inline constexpr char kPassword[] = "secret";
 
 /// TLS trust in the CA of `server`.
 Tarnik::Ref<Tarnik::Ssl::SSLContext> TrustCa(const DevSts::Server& server);
