@@ -33,6 +33,11 @@ bool Holds(const Range (&ranges)[size], char32_t character) noexcept {
   });
 }
 
+bool IsNameStart(char32_t character) noexcept {
+  const char32_t letter = character | 0x20;
+  return (letter >= 'a' && letter <= 'z') || Holds(kNameStart, character);
+}
+
 char32_t Continuation(std::string_view text, std::size_t index) noexcept {
   if (index >= text.size()) {
     return kInvalid;
@@ -88,12 +93,12 @@ bool IsXmlText(std::string_view text) noexcept {
 }
 
 bool IsNCName(std::string_view name) noexcept {
-  if (name.empty() || !Holds(kNameStart, TakeCharacter(name))) {
+  if (name.empty() || !IsNameStart(TakeCharacter(name))) {
     return false;
   }
   while (!name.empty()) {
     const char32_t character = TakeCharacter(name);
-    if (!Holds(kNameStart, character) && !Holds(kNameRest, character)) {
+    if (!IsNameStart(character) && !Holds(kNameRest, character)) {
       return false;
     }
   }

@@ -194,7 +194,7 @@ void CanonicalWalk::WriteStartTag(const ElementNode& element) {
   CollectAttributes(element);
   CollectDeclarations(element);
   output_.Append('<');
-  output_.Append(element.QualifiedNameText());
+  output_.Append(TreeBuilder::NameOf(element).Full());
   for (const Declaration& declaration : declarations_) {
     output_.Append(declaration.prefix.empty() ? " xmlns" : " xmlns:");
     output_.Append(declaration.prefix);
@@ -204,7 +204,7 @@ void CanonicalWalk::WriteStartTag(const ElementNode& element) {
   }
   for (const SortedAttribute& sorted : attributes_) {
     output_.Append(' ');
-    output_.Append(sorted.attribute->Name());
+    output_.Append(TreeBuilder::NameOf(*sorted.attribute).Full());
     output_.Append("=\"");
     output_.AppendAttributeValue(sorted.attribute->Value());
     output_.Append('"');
@@ -215,7 +215,7 @@ void CanonicalWalk::WriteStartTag(const ElementNode& element) {
 
 void CanonicalWalk::WriteEndTag(const ElementNode& element) {
   output_.Append("</");
-  output_.Append(element.QualifiedNameText());
+  output_.Append(TreeBuilder::NameOf(element).Full());
   output_.Append('>');
   scope_.PopTo(depth_);
   --depth_;
@@ -284,7 +284,7 @@ void CanonicalWalk::Declare(const ElementNode& element) {
 void CanonicalWalk::CollectDeclarations(const ElementNode& element) {
   declarations_.clear();
   if (options_.exclusive) {
-    Use(element.Prefix(), element);
+    Use(TreeBuilder::NameOf(element).Prefix(), element);
     for (const SortedAttribute& sorted : attributes_) {
       const std::string_view prefix = TreeBuilder::NameOf(*sorted.attribute).Prefix();
       if (!prefix.empty()) {

@@ -1,0 +1,234 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include <tarnik/xml/character_nodes.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/xml_parse_exception.h>
+#include <tarnik/xml/xml_parser.h>
+
+#include "support/libxml2_oracle.h"
+#include "support/xml_text.h"
+
+namespace Tarnik::Xml {
+namespace {
+
+using TestSupport::ParseXml;
+
+std::string Fault(const std::string& text) {
+  try {
+    ParseXml(text);
+  } catch (const XMLParseException& exception) {
+    return exception.Message();
+  }
+  return "";
+}
+
+TEST(DocumentHandlerTest, BuildsNodesInDocumentOrder) {
+  const Ref<Document> document =
+      ParseXml("<!--before--><r>text<e/><!--c--><?p  data ?>more</r><?after?>");
+  const Node* node = document->FirstChild();
+  ASSERT_EQ(node->Kind(), NodeKind::kComment);
+  EXPECT_EQ(static_cast<const CommentNode*>(node)->Text(), "before");
+  const ElementNode* root = document->RootElement();
+  ASSERT_EQ(node->NextSibling(), root);
+  EXPECT_EQ(root->Parent(), document.get());
+  EXPECT_EQ(root->ParentElement(), nullptr);
+
+  node = root->FirstChild();
+  ASSERT_EQ(node->Kind(), NodeKind::kText);
+  EXPECT_EQ(static_cast<const TextNode*>(node)->Text(), "text");
+  node = node->NextSibling();
+  ASSERT_EQ(node->Kind(), NodeKind::kElement);
+  EXPECT_EQ(node->ParentElement(), root);
+  node = node->NextSibling();
+  ASSERT_EQ(node->Kind(), NodeKind::kComment);
+  node = node->NextSibling();
+  ASSERT_EQ(node->Kind(), NodeKind::kProcessingInstruction);
+  EXPECT_EQ(static_cast<const ProcessingInstructionNode*>(node)->Target(), "p");
+  EXPECT_EQ(static_cast<const ProcessingInstructionNode*>(node)->Text(), "data ");
+  node = node->NextSibling();
+  ASSERT_EQ(node->Kind(), NodeKind::kText);
+  EXPECT_EQ(node->NextSibling(), nullptr);
+  EXPECT_EQ(root->LastChild(), node);
+
+  node = root->NextSibling();
+  ASSERT_EQ(node->Kind(), NodeKind::kProcessingInstruction);
+  EXPECT_EQ(static_cast<const ProcessingInstructionNode*>(node)->Text(), "");
+  EXPECT_EQ(node->NextSibling(), nullptr);
+}
+
+TEST(DocumentHandlerTest, JoinsAdjacentCharacterDataAndCdataToOneText) {
+  const Ref<Document> document = ParseXml("<r>a&amp;b\r\n<![CDATA[<c>]]>&#x20AC;<![CDATA[]]>d</r>");
+  const Node* text = document->RootElement()->FirstChild();
+  ASSERT_EQ(text->Kind(), NodeKind::kText);
+  EXPECT_EQ(static_cast<const TextNode*>(text)->Text(),
+            "a&b\n<c>\xE2\x82\xAC"
+            "d");
+  EXPECT_EQ(text->NextSibling(), nullptr);
+}
+
+TEST(DocumentHandlerTest, KeepsCommentsBetweenTexts) {
+  const Ref<Document> document = ParseXml("<r>admin<!---->.evil</r>");
+  const Node* first = document->RootElement()->FirstChild();
+  EXPECT_EQ(static_cast<const TextNode*>(first)->Text(), "admin");
+  ASSERT_EQ(first->NextSibling()->Kind(), NodeKind::kComment);
+  EXPECT_EQ(static_cast<const TextNode*>(first->NextSibling()->NextSibling())->Text(), ".evil");
+}
+
+TEST(DocumentHandlerTest, KeepsAttributesAndDeclarationsInTheirOrder) {
+  const Ref<Document> document = ParseXml("<r z='1' xmlns:b='urn:b' b:y='2' xmlns='urn:d' a='3'/>");
+  const ElementNode* root = document->RootElement();
+  std::vector<std::string> names;
+  for (std::size_t index = 0; index < root->AttributeCount(); ++index) {
+    names.emplace_back(root->AttributeAt(index).Name());
+  }
+  EXPECT_THAT(names, testing::ElementsAre("z", "xmlns:b", "b:y", "xmlns", "a"));
+  EXPECT_FALSE(root->AttributeAt(0).IsNamespaceDeclaration());
+  EXPECT_TRUE(root->AttributeAt(1).IsNamespaceDeclaration());
+  EXPECT_TRUE(root->AttributeAt(3).IsNamespaceDeclaration());
+  EXPECT_EQ(root->AttributeAt(2).Qualified().Prefix(), "b");
+  EXPECT_EQ(root->AttributeAt(2).Qualified().Local(), "y");
+}
+
+TEST(DocumentHandlerTest, NormalisesAttributeValuesAsXmlDoes) {
+  const Ref<Document> document = ParseXml("<r a='x\t\r\ny' b='&#9;&#10;&#13;'/>");
+  EXPECT_EQ(document->RootElement()->FindAttribute("a"), "x  y");
+  EXPECT_EQ(document->RootElement()->FindAttribute("b"), "\t\n\r");
+}
+
+TEST(DocumentHandlerTest, KnowsThePlaceOfEachNode) {
+  const Ref<Document> document = ParseXml("<r>\n  <e/>tail<!--c-->\n</r>");
+  const Node* node = document->RootElement()->FirstChild();
+  EXPECT_EQ(node->Line(), 1);
+  EXPECT_EQ(node->Column(), 4);
+  node = node->NextSibling();
+  EXPECT_EQ(node->Line(), 2);
+  EXPECT_EQ(node->Column(), 3);
+  node = node->NextSibling();
+  EXPECT_EQ(node->Column(), 7);
+  node = node->NextSibling();
+  EXPECT_EQ(node->Column(), 11);
+}
+
+TEST(DocumentHandlerTest, KeepsNamesApartThatShareASlot) {
+  std::string text = "<r>";
+  for (int index = 0; index < 5000; ++index) {
+    text += "<name" + std::to_string(index) + "/>";
+  }
+  const Ref<Document> document = ParseXml(text + "</r>");
+  int index = 0;
+  for (const Node* node = document->RootElement()->FirstChild(); node != nullptr;
+       node = node->NextSibling()) {
+    ASSERT_EQ(static_cast<const ElementNode*>(node)->QualifiedNameText(),
+              "name" + std::to_string(index));
+    ++index;
+  }
+  EXPECT_EQ(index, 5000);
+}
+
+struct NamespaceCase {
+  const char* name;
+  std::string text;
+  std::string message;
+};
+
+void PrintTo(const NamespaceCase& fault, std::ostream* stream) {
+  *stream << fault.name;
+}
+
+class NamespaceFaultTest : public testing::TestWithParam<NamespaceCase> {};
+
+TEST_P(NamespaceFaultTest, IsRefusedWithItsMessage) {
+  EXPECT_EQ(Fault(GetParam().text), GetParam().message);
+}
+
+constexpr const char* kXmlnsMessage =
+    "Neither the prefix 'xmlns' nor its namespace can be declared at line 1, column 1";
+constexpr const char* kXmlMessage =
+    "The prefix 'xml' and its namespace belong to each other alone at line 1, column 1";
+
+INSTANTIATE_TEST_SUITE_P(
+    Names, NamespaceFaultTest,
+    testing::Values(
+        NamespaceCase{"UnboundElementPrefix", "<a>\n<p:e/></a>",
+                      "The prefix 'p' is not bound to a namespace at line 2, column 1"},
+        NamespaceCase{"UnboundAttributePrefix", "<a p:x='1'/>",
+                      "The prefix 'p' is not bound to a namespace at line 1, column 1"},
+        NamespaceCase{"PrefixOutOfScope", "<a><b xmlns:p='urn:p'/><p:c/></a>",
+                      "The prefix 'p' is not bound to a namespace at line 1, column 24"},
+        NamespaceCase{"SameExpandedName", "<a xmlns:p='urn:1' xmlns:q='urn:1' p:x='1' q:x='2'/>",
+                      "Two attributes of element 'a' have the same name in one namespace at line "
+                      "1, column 1"},
+        NamespaceCase{"EmptyPrefixedDeclaration", "<a xmlns:p=''/>",
+                      "The prefix 'p' is declared as no namespace at line 1, column 1"},
+        NamespaceCase{"XmlnsDeclared", "<a xmlns:xmlns='urn:x'/>", kXmlnsMessage},
+        NamespaceCase{"XmlnsNamespaceDeclared", "<a xmlns:p='http://www.w3.org/2000/xmlns/'/>",
+                      kXmlnsMessage},
+        NamespaceCase{"XmlnsNamespaceAsDefault", "<a xmlns='http://www.w3.org/2000/xmlns/'/>",
+                      kXmlnsMessage},
+        NamespaceCase{"XmlDeclaredAsAnother", "<a xmlns:xml='urn:x'/>", kXmlMessage},
+        NamespaceCase{"XmlNamespaceForAnotherPrefix",
+                      "<a xmlns:p='http://www.w3.org/XML/1998/namespace'/>", kXmlMessage},
+        NamespaceCase{"XmlNamespaceAsDefault", "<a xmlns='http://www.w3.org/XML/1998/namespace'/>",
+                      kXmlMessage},
+        NamespaceCase{"XmlnsElement", "<xmlns:a/>",
+                      "The prefix 'xmlns' is not for elements at line 1, column 1"},
+        NamespaceCase{"TwoColons", "<a:b:c xmlns:a='urn:a'/>",
+                      "The name 'a:b:c' is not a qualified name at line 1, column 1"},
+        NamespaceCase{"LeadingColon", "<:a/>",
+                      "The name ':a' is not a qualified name at line 1, column 1"},
+        NamespaceCase{"TrailingColon", "<a: xmlns:a='urn:a'/>",
+                      "The name 'a:' is not a qualified name at line 1, column 1"},
+        NamespaceCase{"LocalStartsWithDigit", "<a:1 xmlns:a='urn:a'/>",
+                      "The name 'a:1' is not a qualified name at line 1, column 1"},
+        NamespaceCase{"ColonAttribute", "<a xmlns:='urn:a'/>",
+                      "The name 'xmlns:' is not a qualified name at line 1, column 1"},
+        NamespaceCase{"ColonInInstruction", "<a><?x:y z?></a>",
+                      "The processing instruction target 'x:y' holds a colon at line 1, column "
+                      "4"}),
+    [](const auto& test) { return test.param.name; });
+
+// Each would be refused if a rule above reached too far.
+TEST(DocumentHandlerTest, AcceptsWhatNamespacesAllow) {
+  for (const char* text :
+       {"<a xmlns:p='urn:1' xmlns:q='urn:2' p:x='1' q:x='2' x='3'/>",
+        "<p:a xmlns:p='urn:1' xmlns='urn:1' p:x='1' x='2'/>",
+        "<a xmlns:xml='http://www.w3.org/XML/1998/namespace' xml:lang='en'/>", "<a xml:lang='en'/>",
+        "<a xmlns='urn:a'><b xmlns=''/></a>", "<xmlns/>", "<a xmlns:xmlfoo='urn:x'/>",
+        "<a xmlns:p='urn:1'><p:b xmlns:p='urn:2' p:x=''/><p:c/></a>"}) {
+    EXPECT_EQ(Fault(text), "") << text;
+    EXPECT_TRUE(TestSupport::IsWellFormedForLibXml2(text)) << text;
+  }
+}
+
+TEST(DocumentHandlerTest, FindsOneDuplicateAmongManyAttributes) {
+  std::string text = "<a xmlns:p='urn:1' xmlns:q='urn:1'";
+  for (int index = 0; index < 1000; ++index) {
+    text += " p:x" + std::to_string(index) + "=''";
+  }
+  EXPECT_EQ(Fault(text + " q:y=''/>"), "");
+  EXPECT_NE(Fault(text + " q:x500=''/>"), "");
+}
+
+TEST(DocumentHandlerTest, IsUsedOnce) {
+  const Ref<XMLHandler> handler = CreateXMLDocumentHandler();
+  handler->StartElement({1, 1}, "a", nullptr, 0);
+  handler->EndElement({1, 1});
+  handler->EndDocument();
+  EXPECT_THROW(handler->StartElement({1, 1}, "a", nullptr, 0), InvalidStateException);
+  EXPECT_THROW(handler->EndDocument(), InvalidStateException);
+}
+
+TEST(DocumentHandlerTest, RefusesEventsOutOfPlace) {
+  const Ref<XMLHandler> handler = CreateXMLDocumentHandler();
+  EXPECT_THROW(handler->EndElement({1, 1}), InvalidStateException);
+  EXPECT_THROW(handler->Characters({1, 1}, "x"), InvalidStateException);
+  EXPECT_THROW(handler->EndDocument(), InvalidStateException);
+  handler->StartElement({1, 1}, "a", nullptr, 0);
+  EXPECT_THROW(handler->EndDocument(), InvalidStateException);
+}
+
+}  // namespace
+}  // namespace Tarnik::Xml
