@@ -38,6 +38,9 @@ class SensitiveText {
 
   /// Drops the first `count` bytes; the others move to the front.
   void RemovePrefix(std::size_t count) {
+    if (count == 0) {
+      return;
+    }
     if (count == text_.size()) {
       Clear();
       return;
