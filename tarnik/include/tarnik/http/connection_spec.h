@@ -24,7 +24,8 @@ class TARNIK_EXPORT CustomConnectionSpec : public ConnectionSpec {
   virtual std::string Host() const = 0;
   /// The host that cookies belong to.
   virtual std::string CookieHost() const = 0;
-  /// Tells connections apart: two specs of one key lead to the same place. "host:port".
+  /// Names the place in messages and tells the connections of this spec apart: "host:port". The
+  /// port becomes part of the Host header, unless it is the scheme's own.
   virtual std::string EndpointKey() const = 0;
   /// True when requests name the whole URL because they go to a proxy.
   virtual bool IsProxy() const = 0;
