@@ -138,7 +138,7 @@ TEST(CreateSamlToken, ToleratesTenMinutesUnlessTold) {
   EXPECT_NO_THROW(CreateSamlTokenFromDom(ParseXml(nineMinutes)->RootElement()));
   EXPECT_THROW(CreateSamlToken(elevenMinutes), ParseException);
   EXPECT_THROW(CreateSamlTokenFromDom(ParseXml(elevenMinutes)->RootElement()), ParseException);
-  EXPECT_THROW(CreateSamlToken(nineMinutes, 0), ParseException);
+  EXPECT_THROW(CreateSamlToken(nineMinutes, 0L), ParseException);
   EXPECT_NO_THROW(CreateSamlToken(elevenMinutes, 720));
   EXPECT_NO_THROW(CreateSamlTokenFromDom(ParseXml(elevenMinutes)->RootElement(), 720));
 }
@@ -280,8 +280,8 @@ TEST(CreateSamlToken, ReadsUtf8Alone) {
         CreateSamlToken(std::string("<?xml version='1.0' encoding='") + encoding + "'?>" + xml),
         XMLParseException);
   }
-  for (const std::string bytes : {std::string("\xC0\x80"), std::string("\xED\xA0\x80"),
-                                  std::string(1, '\0'), std::string("\xEF\xBF\xBE")}) {
+  for (const std::string& bytes : {std::string("\xC0\x80"), std::string("\xED\xA0\x80"),
+                                   std::string(1, '\0'), std::string("\xEF\xBF\xBE")}) {
     EXPECT_THROW(CreateSamlToken(Replaced(xml, "Archer", bytes)), XMLParseException);
   }
 }

@@ -1,0 +1,114 @@
+#include <ssoclient/saml_token.h>
+
+#include <functional>
+
+#include "support/assertion_text.h"
+
+// Edits of a signed token's text: those that its canonical form ignores change nothing that a
+// caller sees, those of a value that is read are seen as tampering.
+namespace SsoClient {
+namespace {
+
+using TestSupport::AssertionText;
+using TestSupport::Replaced;
+
+std::string SignedXml() {
+  static const std::string xml =
+      AssertionText().Delegate().ToSignedXml(TestSupport::TrustedCredential());
+  return xml;
+}
+
+// Everything that a token tells, in one text.
+std::string AllValues(const SamlToken& token) {
+  std::string text = CreateSamlTokenDescription(token) + token.Id() + token.Issuer();
+  SubjectNames names;
+  token.GetSubjectNames(names);
+  text += names.givenName + names.surname;
+  std::set<std::string> audiences;
+  token.GetAudiences(audiences);
+  for (const std::string& audience : audiences) {
+    text += audience;
+  }
+  std::vector<Advice> advice;
+  token.GetAdvice(advice);
+  for (const Advice& block : advice) {
+    text += block.source;
+    for (const AdviceAttribute& attribute : block.attributes) {
+      text += attribute.name;
+      for (const std::string& value : attribute.values) {
+        text += value;
+      }
+    }
+  }
+  return text;
+}
+
+struct Edit {
+  const char* from;
+  const char* to;
+};
+
+class NeutralEdit : public testing::TestWithParam<Edit> {};
+
+TEST_P(NeutralEdit, KeepsVerdictAndValues) {
+  const auto resolver = TestSupport::TrustedResolver();
+  const std::string edited = Replaced(SignedXml(), GetParam().from, GetParam().to);
+  EXPECT_EQ(AllValues(*CreateSamlToken(edited, resolver.get())),
+            AllValues(*CreateSamlToken(SignedXml(), resolver.get())));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    CanonicalForm, NeutralEdit,
+    testing::Values(Edit{"ID=\"_a1\"", "ID='_a1'"}, Edit{"ID=\"_a1\"", "ID = \n \"_a1\""},
+                    Edit{"ID=\"_a1\"", "ID=\"_&#97;1\""},
+                    Edit{"alice@example.com", "&#x61;lice@example.com"},
+                    Edit{"alice@example.com", "<![CDATA[alice@example.com]]>"},
+                    Edit{"alice@example.com", "alice<![CDATA[@]]>example.com"},
+                    Edit{"EXAMPLE\\staff", "EXAMPLE&#92;staff"},
+                    Edit{"<saml2:ProxyRestriction Count=\"10\"/>",
+                         "<saml2:ProxyRestriction Count=\"10\"></saml2:ProxyRestriction>"},
+                    Edit{"<saml2:ProxyRestriction Count=\"10\"/>",
+                         "<saml2:ProxyRestriction\n  Count = '10' />"},
+                    Edit{"Postdatable=\"false\" RenewExpired=\"true\"",
+                         "RenewExpired=\"true\" Postdatable=\"false\""},
+                    Edit{"<saml2:Subject>", "<!-- a comment --><saml2:Subject>"},
+                    Edit{"</saml2:Subject>", "<!----></saml2:Subject>"},
+                    Edit{"<saml2:Subject>", "<saml2:Subject xmlns:unused=\"urn:unused\">"}));
+
+TEST(NeutralEdit, AcceptsTextAroundTheDocumentElement) {
+  const auto resolver = TestSupport::TrustedResolver();
+  EXPECT_EQ(AllValues(*CreateSamlToken("<?xml version=\"1.0\"?>\r\n<!--c-->" + SignedXml() + "\n",
+                                       resolver.get())),
+            AllValues(*CreateSamlToken(SignedXml(), resolver.get())));
+}
+
+class ValueEdit : public testing::TestWithParam<Edit> {};
+
+TEST_P(ValueEdit, IsSeenAsTampering) {
+  const std::string edited = Replaced(SignedXml(), GetParam().from, GetParam().to);
+  // The twin: without a resolver nothing is wrong with the text.
+  EXPECT_NO_THROW(CreateSamlToken(edited));
+  EXPECT_THROW(CreateSamlToken(edited, TestSupport::TrustedResolver().get()),
+               InvalidSignatureException);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    EveryValue, ValueEdit,
+    testing::Values(Edit{"https://sts.example.com/STS", "https://sts.example.com/STS2"},
+                    Edit{"nameid-format:entity", "nameid-format:entitx"},
+                    Edit{"alice@example.com", "alicf@example.com"},
+                    Edit{"https://a.example", "https://c.example"},
+                    Edit{"<saml2:Audience>https://a.example</saml2:Audience>", ""},
+                    Edit{"Count=\"10\"", "Count=\"11\""}, Edit{"Count=\"5\"", "Count=\"05\""},
+                    Edit{"Postdatable=\"false\"", "Postdatable=\"0\""},
+                    Edit{"RenewExpired=\"true\"", "RenewExpired=\"TRUE\""},
+                    Edit{"first@example.com", "other@example.com"},
+                    Edit{"2024-03-05T07:08:09.010Z", "2024-03-05T07:08:09.011Z"},
+                    Edit{"urn:source", "urn:sourcf"}, Edit{"urn:hint", "urn:hins"},
+                    Edit{">one<", ">two <"}, Edit{"PasswordProtectedTransport", "Password"},
+                    Edit{"EXAMPLE\\staff", "EXAMPLE\\stafg"}, Edit{">false<", ">true<"},
+                    Edit{">Alice<", ">Alicf<"}, Edit{">Archer<", ">Archer <"},
+                    Edit{"<saml2:Subject>", "<saml2:Subject> "}));
+
+}  // namespace
+}  // namespace SsoClient
