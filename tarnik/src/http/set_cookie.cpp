@@ -18,6 +18,10 @@ struct NameAndValue {
   bool hasValue;
 };
 
+bool HoldsControl(std::string_view text) {
+  return std::any_of(text.begin(), text.end(), IsControl);
+}
+
 /// Takes the text before the next semicolon off `header` and splits it at its first "=".
 NameAndValue TakePair(std::string_view& header) {
   const auto end = std::min(header.find(';'), header.size());
@@ -106,7 +110,7 @@ std::optional<SetCookie> ParseSetCookie(std::string_view header, const System::D
     return std::nullopt;
   }
   const NameAndValue pair = TakePair(header);
-  if (!pair.hasValue || pair.name.empty()) {
+  if (!pair.hasValue || pair.name.empty() || HoldsControl(pair.name) || HoldsControl(pair.value)) {
     return std::nullopt;
   }
   SetCookie cookie;

@@ -44,6 +44,11 @@ TEST_F(CookieStoreTest, KeepsEveryCharacterOfTheValue) {
   EXPECT_EQ(Header(), "id=\"a b=c,d\"");
 }
 
+TEST_F(CookieStoreTest, TrimsTabsAroundNameAndValue) {
+  Store("\tid\t=\t42\t;\tPath\t=\t/");
+  EXPECT_EQ(Header("sts.example", "/"), "id=42");
+}
+
 TEST_F(CookieStoreTest, KeepsAnEmptyValue) {
   Store("id=");
   EXPECT_EQ(Header(), "id=");
@@ -96,8 +101,8 @@ INSTANTIATE_TEST_SUITE_P(
                     IgnoredCookie{"a=1; Expires=Tue, 01 Jan 2030 00:00:00 GMT"},
                     IgnoredCookie{"a=1; Expires=Wed, 01 Jan 2020 00:00:00 GMT"},
                     IgnoredCookie{"a=1\r\nX: y"}, IgnoredCookie{std::string("a=1\0", 4)},
-                    IgnoredCookie{"a=\x01"}, IgnoredCookie{"a=1\x7F"},
-                    IgnoredCookie{"a=" + std::string(4095, 'x')}));
+                    IgnoredCookie{"a=\x01"}, IgnoredCookie{"a=b\tc"}, IgnoredCookie{"a\tb=c"},
+                    IgnoredCookie{"a=1\x7F"}, IgnoredCookie{"a=" + std::string(4095, 'x')}));
 
 TEST_F(CookieStoreTest, AcceptsACookieOfTheLargestSize) {
   const std::string cookie = "a=" + std::string(4094, 'x');
