@@ -272,7 +272,7 @@ TEST(ParseValidateResponseTest, TellsTheVerdict) {
 }
 
 TEST(ParseValidateResponseTest, AnyOtherCodeIsUnexpected) {
-  for (const std::string code :
+  for (const std::string& code :
        {std::string(), " " + std::string(kValid), std::string(kValid) + " ",
         std::string(kValid) + "\n", std::string(kValid) + "x",
         std::string("http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/VALID"),

@@ -20,7 +20,7 @@ struct Report {
 };
 
 // Runs `operation` asynchronously and waits for the one report.
-Report Run(std::function<int()> operation) {
+Report RunAndWait(std::function<int()> operation) {
   auto promise = std::make_shared<std::promise<Report>>();
   auto future = promise->get_future();
   SyncToAsyncCall<int>(std::move(operation),
@@ -36,7 +36,7 @@ Report Run(std::function<int()> operation) {
 }
 
 TEST(SyncToAsyncCallTest, ReportsAResultFromAnotherThread) {
-  const auto report = Run([] { return 42; });
+  const auto report = RunAndWait([] { return 42; });
   EXPECT_EQ(report.result, 42);
   EXPECT_EQ(report.errorType, "");
   EXPECT_NE(report.thread, std::this_thread::get_id());
@@ -44,11 +44,11 @@ TEST(SyncToAsyncCallTest, ReportsAResultFromAnotherThread) {
 
 TEST(SyncToAsyncCallTest, ReportsAnyPlatformExceptionWithItsClass) {
   const auto expired =
-      Run([]() -> int { throw PasswordExpiredException("Authentication failed: expired"); });
+      RunAndWait([]() -> int { throw PasswordExpiredException("Authentication failed: expired"); });
   EXPECT_EQ(expired.result, 0);
   EXPECT_EQ(expired.errorType, typeid(PasswordExpiredException).name());
   EXPECT_EQ(expired.message, "Authentication failed: expired");
-  const auto argument = Run([]() -> int { throw Tarnik::InvalidArgumentException("bad"); });
+  const auto argument = RunAndWait([]() -> int { throw Tarnik::InvalidArgumentException("bad"); });
   EXPECT_EQ(argument.errorType, typeid(Tarnik::InvalidArgumentException).name());
 }
 
@@ -69,7 +69,7 @@ TEST(SyncToAsyncCallTest, RefusesAnEmptyCallbackAtTheCall) {
 }
 
 TEST(SyncToAsyncCallTest, AnOperationMayWaitForAnother) {
-  const auto report = Run([] { return Run([] { return 7; }).result + 1; });
+  const auto report = RunAndWait([] { return RunAndWait([] { return 7; }).result + 1; });
   EXPECT_EQ(report.result, 8);
 }
 
@@ -89,7 +89,7 @@ using SyncToAsyncCallDeathTest = testing::Test;
 
 TEST(SyncToAsyncCallDeathTest, OtherExceptionsLeaveTheWorkItem) {
   testing::GTEST_FLAG(death_test_style) = "threadsafe";
-  EXPECT_DEATH(Run([]() -> int { throw std::runtime_error("not the platform's"); }),
+  EXPECT_DEATH(RunAndWait([]() -> int { throw std::runtime_error("not the platform's"); }),
                "not the platform's");
 }
 
