@@ -179,7 +179,7 @@ INSTANTIATE_TEST_SUITE_P(Algorithms, SigningAlgorithmTest,
                                                        DigestAlgorithm::Sha256, KeyType::EcP256},
                                            SigningCase{"Ecdsa384", SignatureAlgorithm::EcdsaSha384,
                                                        DigestAlgorithm::Sha384, KeyType::EcP384}),
-                         [](const auto& info) { return info.param.name; });
+                         [](const auto& tested) { return tested.param.name; });
 
 class AnswerShapeTest : public StsTest {};
 

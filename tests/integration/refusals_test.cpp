@@ -225,7 +225,7 @@ INSTANTIATE_TEST_SUITE_P(Texts, UnsendableTextTest,
                                            UnsendableCase{"OverlongUtf8", "hush\xC0\x80"},
                                            UnsendableCase{"Surrogate", "hush\xED\xA0\x80"},
                                            UnsendableCase{"Fffe", "hush\xEF\xBF\xBE"}),
-                         [](const auto& info) { return info.param.name; });
+                         [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
 }  // namespace SsoClient::Tests

@@ -65,7 +65,7 @@ INSTANTIATE_TEST_SUITE_P(
         PeerCase{"NulInName", With(ServerCertificate::NulInName), "localhost", "localhost"},
         PeerCase{"Tls11", With(TlsProtocol::Tls11Only), "localhost", "handshake"},
         PeerCase{"AnonymousSuites", With(TlsProtocol::AnonymousSuites), "localhost", "handshake"}),
-    [](const auto& info) { return info.param.name; });
+    [](const auto& tested) { return tested.param.name; });
 
 TEST(TlsTrustTest, AnotherCaIsNotTrusted) {
   const DevSts::Server server;
