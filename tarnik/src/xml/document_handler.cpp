@@ -68,6 +68,7 @@ class DocumentHandler final : public XMLHandler, public ObjectImpl {
   Ref<Document> document_;
   ParentNode* current_;
   unsigned depth_ = 0;
+  std::size_t openAttributes_ = 0;
   NameCache names_;
   NamespaceScope scope_;
   std::string pendingText_;
@@ -98,6 +99,12 @@ void DocumentHandler::FlushText() {
 void DocumentHandler::StartElement(const Position& position, std::string_view name,
                                    const ParsedAttribute* attributes, std::size_t count) {
   Current();
+  openAttributes_ += count;
+  if (openAttributes_ > kMaxOpenAttributes) {
+    throw XMLParseException("An element and those around it have more than " +
+                                std::to_string(kMaxOpenAttributes) + " attributes",
+                            position);
+  }
   FlushText();
   ElementNode* element = TreeBuilder::NewElement(*tree_, Intern(name, position));
   ++depth_;
@@ -133,6 +140,7 @@ void DocumentHandler::EndElement(const Position&) {
   FlushText();
   scope_.PopTo(depth_);
   --depth_;
+  openAttributes_ -= static_cast<const ElementNode*>(current_)->AttributeCount();
   current_ = current_->Parent();
 }
 

@@ -212,6 +212,24 @@ TEST(DocumentHandlerTest, FindsOneDuplicateAmongManyAttributes) {
   EXPECT_NE(Fault(text + " q:x500=''/>"), "");
 }
 
+std::string Attributes(std::size_t count) {
+  std::string text;
+  for (std::size_t index = 0; index < count; ++index) {
+    text += (index % 2 == 0 ? " xmlns:p" : " p") + std::to_string(index) + "='urn:x'";
+  }
+  return text;
+}
+
+TEST(DocumentHandlerTest, HoldsTheLimitOfOpenAttributes) {
+  const std::string half = Attributes(kMaxOpenAttributes / 2);
+  EXPECT_EQ(Fault("<a" + half + "><b" + half + "/>\n<b" + half + "/></a>"), "");
+  constexpr const char* kMessage = "An element and those around it have more than 1024 attributes ";
+  EXPECT_EQ(Fault("<a" + half + ">\n<b" + half + "><c x=''/></b></a>"),
+            kMessage + ("at line 2, column " +
+                        std::to_string(std::string("<b>").size() + half.size() + 1)));
+  EXPECT_EQ(Fault("<a" + Attributes(100000) + "/>"), std::string(kMessage) + "at line 1, column 1");
+}
+
 TEST(DocumentHandlerTest, IsUsedOnce) {
   const Ref<XMLHandler> handler = CreateXMLDocumentHandler();
   handler->StartElement({1, 1}, "a", nullptr, 0);

@@ -39,8 +39,13 @@ class TARNIK_EXPORT XMLHandler : public virtual Object {
 
 /// A handler that builds a `Document` and checks what Namespaces in XML 1.0 demands: every prefix
 /// is bound, no two attributes of an element share an expanded name, and "xml" and "xmlns" are used
-/// rightly.
+/// rightly. It also refuses an element when that element and those around it have more than
+/// `kMaxOpenAttributes` attributes, so that looking a namespace up in the tree stays cheap.
 TARNIK_EXPORT Ref<XMLHandler> CreateXMLDocumentHandler();
+
+/// How many attributes, namespace declarations included, the elements from the root of a parsed
+/// document to any one element may have together.
+inline constexpr std::size_t kMaxOpenAttributes = 1024;
 
 /// What no parsed document may exceed.
 inline constexpr std::size_t kMaxElementDepth = 256;
