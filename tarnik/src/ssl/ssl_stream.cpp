@@ -62,6 +62,7 @@ class SSLStreamImpl final : public SSLStream, public ObjectImpl {
     std::vector<std::function<void()>> completions;
     bool read = false;
     bool write = false;
+    bool close = false;
   };
 
   void AdvanceSoon();
@@ -199,12 +200,18 @@ void SSLStreamImpl::Advance() {
     }
     steps.read = steps.read && !readingBelow_;
     readingBelow_ = readingBelow_ || steps.read;
+    // A connection that has failed is of no use: its reads must not keep it alive, should nobody
+    // close it.
+    steps.close = failure_ != nullptr && !writingBelow_;
   }
   if (steps.write) {
     WriteBelow();
   }
   if (steps.read) {
     ReadBelow();
+  }
+  if (steps.close) {
+    below_->Close();
   }
   for (const auto& completion : steps.completions) {
     completion();
