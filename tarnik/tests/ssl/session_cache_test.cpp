@@ -1,0 +1,106 @@
+#include "ssl/session_cache.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "ssl/tls_fixture.h"
+
+namespace Tarnik::Ssl {
+namespace {
+
+using namespace std::chrono_literals;
+using Testing::MakeIdentity;
+using Testing::TestPki;
+
+/// A session that looks like one of a handshake of `version` with the test's leaf.
+OpenSsl::OwnedSslSession MakeSession(int version, const Testing::Identity& leaf) {
+  // Only a real handshake leaves a peer certificate in a session.
+  Testing::TlsPeerOptions options;
+  options.identity = &leaf;
+  options.minVersion = options.maxVersion = version;
+  const auto serverContext = Testing::MakeServerContext(options);
+  const OpenSsl::OwnedSslContext clientContext(SSL_CTX_new(TLS_client_method()));
+  const OpenSsl::OwnedSsl server(SSL_new(serverContext.get()));
+  const OpenSsl::OwnedSsl client(SSL_new(clientContext.get()));
+  BIO* near = nullptr;
+  BIO* far = nullptr;
+  BIO_new_bio_pair(&near, 0, &far, 0);
+  SSL_set_bio(client.get(), near, near);
+  SSL_set_bio(server.get(), far, far);
+  SSL_set_connect_state(client.get());
+  SSL_set_accept_state(server.get());
+  for (int i = 0; i < 10; ++i) {
+    SSL_do_handshake(client.get());
+    SSL_do_handshake(server.get());
+  }
+  char byte = 0;
+  SSL_write(server.get(), "x", 1);
+  SSL_read(client.get(), &byte, 1);
+  OpenSsl::OwnedSslSession session(SSL_get1_session(client.get()));
+  SSL_set_shutdown(client.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
+  return session;
+}
+
+OpenSsl::OwnedSslSession CopyOf(const OpenSsl::OwnedSslSession& session) {
+  return OpenSsl::OwnedSslSession(SSL_SESSION_dup(session.get()));
+}
+
+class SessionCacheTest : public testing::Test {
+ protected:
+  const SessionCache::Clock::time_point now_ = SessionCache::Clock::now();
+  const OpenSsl::OwnedSslSession tls12_ = MakeSession(TLS1_2_VERSION, TestPki::Get().leaf);
+  const OpenSsl::OwnedSslSession tls13_ = MakeSession(TLS1_3_VERSION, TestPki::Get().leaf);
+  SessionCache cache_;
+};
+
+TEST_F(SessionCacheTest, GivesASessionToItsPeerAlone) {
+  cache_.Put("a", CopyOf(tls12_), now_);
+  EXPECT_EQ(cache_.Take("b", now_), nullptr);
+  EXPECT_NE(cache_.Take("a", now_), nullptr);
+}
+
+TEST_F(SessionCacheTest, GivesATls13SessionOnceAndATls12SessionAgain) {
+  cache_.Put("a", CopyOf(tls13_), now_);
+  EXPECT_NE(cache_.Take("a", now_), nullptr);
+  EXPECT_EQ(cache_.Take("a", now_), nullptr);
+  cache_.Put("a", CopyOf(tls12_), now_);
+  EXPECT_NE(cache_.Take("a", now_), nullptr);
+  EXPECT_NE(cache_.Take("a", now_), nullptr);
+}
+
+TEST_F(SessionCacheTest, ForgetsSessionsWithTime) {
+  cache_.Put("a", CopyOf(tls12_), now_);
+  EXPECT_NE(cache_.Take("a", now_ + SessionCache::kMaxAge - 1s), nullptr);
+  EXPECT_EQ(cache_.Take("a", now_ + SessionCache::kMaxAge), nullptr);
+  EXPECT_EQ(cache_.Size(), 0U);
+}
+
+TEST_F(SessionCacheTest, ForgetsASessionWhosePeerCertificateHasExpired) {
+  Testing::IdentityOptions options;
+  options.notAfter = -60;
+  const auto expired = MakeIdentity(options, &TestPki::Get().root);
+  cache_.Put("a", MakeSession(TLS1_2_VERSION, expired), now_);
+  EXPECT_EQ(cache_.Size(), 1U);
+  EXPECT_EQ(cache_.Take("a", now_), nullptr);
+  EXPECT_EQ(cache_.Size(), 0U);
+}
+
+TEST_F(SessionCacheTest, KeepsFewSessionsOfOnePeer) {
+  for (std::size_t i = 0; i < SessionCache::kMaxSessionsOfPeer + 3; ++i) {
+    cache_.Put("a", CopyOf(tls13_), now_);
+  }
+  EXPECT_EQ(cache_.Size(), SessionCache::kMaxSessionsOfPeer);
+}
+
+TEST_F(SessionCacheTest, DropsTheOldestPastItsBound) {
+  for (std::size_t i = 0; i < SessionCache::kMaxSessions + 1; ++i) {
+    cache_.Put("peer " + std::to_string(i), CopyOf(tls12_), now_);
+  }
+  EXPECT_EQ(cache_.Size(), SessionCache::kMaxSessions);
+  EXPECT_EQ(cache_.Take("peer 0", now_), nullptr);
+  EXPECT_NE(cache_.Take("peer 1", now_), nullptr);
+}
+
+}  // namespace
+}  // namespace Tarnik::Ssl

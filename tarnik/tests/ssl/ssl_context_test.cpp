@@ -1,0 +1,139 @@
+#include <tarnik/ssl/ssl_context.h>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "ssl/tls_fixture.h"
+
+namespace Tarnik::Ssl {
+namespace {
+
+using Testing::Identity;
+using Testing::IdentityOptions;
+using Testing::MakeIdentity;
+using Testing::TestPki;
+using Testing::TlsClient;
+using Testing::TlsPeerOptions;
+using Testing::TlsServer;
+using Testing::TrustingContext;
+
+std::string HandshakeWithLeaf(TlsPeerOptions peer) {
+  if (peer.ciphers != "aNULL") {
+    peer.identity = &TestPki::Get().leaf;
+  }
+  TlsServer server(peer, 1);
+  return TlsClient(*TrustingContext(TestPki::Get().root), server.Port()).Message();
+}
+
+TEST(SSLContext, SpeaksTls12And13) {
+  for (const int version : {TLS1_2_VERSION, TLS1_3_VERSION}) {
+    TlsPeerOptions peer;
+    peer.minVersion = peer.maxVersion = version;
+    EXPECT_EQ(HandshakeWithLeaf(peer), "");
+  }
+}
+
+TEST(SSLContext, RefusesAPeerOfAnOlderProtocol) {
+  TlsPeerOptions peer;
+  peer.minVersion = TLS1_VERSION;
+  peer.maxVersion = TLS1_1_VERSION;
+  peer.ciphers = "ALL";
+  peer.securityLevel = 0;
+  EXPECT_EQ(HandshakeWithLeaf(peer),
+            "TLS handshake with sts.example failed: tlsv1 alert protocol version");
+}
+
+struct CipherCase {
+  const char* ciphers;
+  const char* message;
+};
+
+TEST(SSLContext, OffersNoWeakSuites) {
+  const char* const refusal =
+      "TLS handshake with sts.example failed: sslv3 alert handshake failure";
+  for (const CipherCase& suite : {CipherCase{"aNULL", refusal}, CipherCase{"eNULL", refusal},
+                                  CipherCase{"ECDHE-ECDSA-AES128-GCM-SHA256", ""}}) {
+    TlsPeerOptions peer;
+    peer.maxVersion = TLS1_2_VERSION;
+    peer.ciphers = suite.ciphers;
+    peer.securityLevel = 0;
+    EXPECT_EQ(HandshakeWithLeaf(peer), suite.message) << suite.ciphers;
+  }
+}
+
+class SSLContextResumption : public testing::TestWithParam<int> {
+ protected:
+  SSLContextResumption() {
+    IdentityOptions options;
+    options.dnsNames = {"sts.example", "other.example"};
+    options.addresses = {"127.0.0.1"};
+    leaf_ = MakeIdentity(options, &TestPki::Get().root);
+    peer_.identity = &leaf_;
+    peer_.minVersion = peer_.maxVersion = GetParam();
+  }
+
+  static void Exchange(SSLContext& context, int port, const std::string& host,
+                       const std::string& serverName = "") {
+    const TlsClient client(context, port, host, serverName);
+    ASSERT_EQ(client.Message(), "");
+    std::string error;
+    EXPECT_EQ(Testing::ReadAll(client.Stream(), 100, &error), "hello");
+    EXPECT_EQ(error, "");
+  }
+
+  Identity leaf_;
+  TlsPeerOptions peer_;
+};
+
+TEST_P(SSLContextResumption, ResumesTowardsTheSamePeer) {
+  TlsServer server(peer_, 3);
+  const auto context = TrustingContext(TestPki::Get().root);
+  Exchange(*context, server.Port(), "sts.example");
+  Exchange(*context, server.Port(), "sts.example");
+  Exchange(*context, server.Port(), "STS.example");
+  EXPECT_FALSE(server.Join()[0].resumed);
+  EXPECT_TRUE(server.Join()[1].resumed);
+  EXPECT_TRUE(server.Join()[2].resumed);
+}
+
+TEST_P(SSLContextResumption, DoesNotResumeTowardsAnother) {
+  TlsServer server(peer_, 4);
+  const auto context = TrustingContext(TestPki::Get().root);
+  Exchange(*context, server.Port(), "sts.example");
+  Exchange(*context, server.Port(), "other.example");
+  Exchange(*context, server.Port(), "sts.example", "other.example");
+  Exchange(*context, server.Port(), "127.0.0.1", "sts.example");
+  for (const auto& connection : server.Join()) {
+    EXPECT_FALSE(connection.resumed);
+  }
+}
+
+TEST_P(SSLContextResumption, DoesNotResumeFromAnotherContext) {
+  TlsServer server(peer_, 2);
+  Exchange(*TrustingContext(TestPki::Get().root), server.Port(), "sts.example");
+  Exchange(*TrustingContext(TestPki::Get().root), server.Port(), "sts.example");
+  EXPECT_FALSE(server.Join()[1].resumed);
+}
+
+TEST_P(SSLContextResumption, KeepsNoSessionOfAPeerThatItRefuses) {
+  TlsServer server(peer_, 2);
+  const auto context = TrustingContext(Testing::MakeCa("Stranger"));
+  for (int i = 0; i < 2; ++i) {
+    EXPECT_NE(TlsClient(*context, server.Port()).Message(), "");
+  }
+  EXPECT_FALSE(server.Join()[1].resumed);
+}
+
+INSTANTIATE_TEST_SUITE_P(Versions, SSLContextResumption,
+                         testing::Values(TLS1_2_VERSION, TLS1_3_VERSION), Testing::NameOfVersion);
+
+TEST(SSLContext, RefusesToWrapNothing) {
+  const auto context = CreateSSLContext({});
+  EXPECT_THROW(context->WrapStream(nullptr, ""), InvalidArgumentException);
+  EXPECT_EQ(context->ToString(), "<SSLContext>");
+}
+
+}  // namespace
+}  // namespace Tarnik::Ssl

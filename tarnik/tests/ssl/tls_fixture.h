@@ -1,0 +1,73 @@
+#ifndef TARNIK_TESTS_SSL_TLS_FIXTURE_H
+#define TARNIK_TESTS_SSL_TLS_FIXTURE_H
+
+#include <gtest/gtest.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/ssl/ssl_exception.h>
+#include <tarnik/system/tcp_client_socket.h>
+
+#include <string>
+
+#include "support/outcome.h"
+#include "support/test_pki.h"
+#include "support/tls_peer.h"
+
+namespace Tarnik::Testing {
+
+/// The certificates that most tests share; made once, since keys take time.
+struct TestPki {
+  Identity root = MakeCa("Root");
+  Identity intermediate = MakeCa("Intermediate", &root);
+  Identity leaf = MakeIdentity({}, &root);
+
+  static const TestPki& Get() {
+    static const TestPki* const pki = new TestPki();
+    return *pki;
+  }
+};
+
+/// For tests whose parameter is a version of TLS.
+inline std::string NameOfVersion(const testing::TestParamInfo<int>& version) {
+  return version.param == TLS1_2_VERSION ? "Tls12" : "Tls13";
+}
+
+inline Ref<Ssl::SSLContext> TrustingContext(const Identity& ca) {
+  Ssl::SSLContextConfig config;
+  config.caCertificates = {ca.ToCertificate()};
+  return Ssl::CreateSSLContext(config);
+}
+
+/// A TLS stream over TCP to a port of the loopback interface; closed with its owner.
+class TlsClient {
+ public:
+  TlsClient(Ssl::SSLContext& context, int port, const std::string& host = "sts.example",
+            const std::string& serverName = "")
+      : socket_(System::CreateTCPClientSocket(System::GetThreadPool().get())) {
+    const Outcome connected;
+    socket_->ConnectAsync("127.0.0.1", port, [connected](System::TCPClientSocket*, Exception* e) {
+      connected.Report(e);
+    });
+    EXPECT_TRUE(connected.Wait());
+    EXPECT_EQ(connected.Message(), "");
+    stream_ = context.WrapStream(socket_.get(), "");
+    stream_->HandshakeClientAsync(host, serverName, handshake_.ForWrite());
+    EXPECT_TRUE(handshake_.Wait());
+  }
+  ~TlsClient() { stream_->Close(); }
+  TlsClient(const TlsClient&) = delete;
+  TlsClient& operator=(const TlsClient&) = delete;
+
+  /// Empty when the handshake has succeeded.
+  std::string Message() const { return handshake_.Message(); }
+  const Outcome& Handshake() const { return handshake_; }
+  Ssl::SSLStream& Stream() const { return *stream_; }
+
+ private:
+  Ref<System::TCPClientSocket> socket_;
+  Ref<Ssl::SSLStream> stream_;
+  Outcome handshake_;
+};
+
+}  // namespace Tarnik::Testing
+
+#endif

@@ -1,0 +1,60 @@
+#ifndef TARNIK_TESTS_SUPPORT_TEST_PKI_H
+#define TARNIK_TESTS_SUPPORT_TEST_PKI_H
+
+#include <tarnik/crypto/certificate.h>
+
+#include <string>
+#include <vector>
+
+#include "support/openssl.h"
+
+namespace Tarnik::Testing {
+
+/// A certificate with its EC key.
+struct Identity {
+  OpenSsl::OwnedCertificate certificate;
+  OpenSsl::OwnedKey key;
+
+  std::string Pem() const;
+  /// As the platform sees it.
+  Ref<const Crypto::Certificate> ToCertificate() const;
+};
+
+struct IdentityOptions {
+  std::string commonName = "sts.example";
+  /// Raw bytes of the dNSName entries; a NUL stays where it is.
+  std::vector<std::string> dnsNames = {"sts.example"};
+  std::vector<std::string> addresses = {};
+  bool isCa = false;
+  /// Seconds from now.
+  long notBefore = -3600;
+  long notAfter = 3600;
+  /// For example "clientAuth"; none if empty.
+  std::string extendedKeyUsage = "";
+};
+
+/// Issued by `issuer`, or by itself if that is null.
+Identity MakeIdentity(const IdentityOptions& options, const Identity* issuer);
+Identity MakeCa(const std::string& commonName, const Identity* issuer = nullptr);
+
+/// A PEM revocation list of `issuer` that revokes `revoked`; null revokes nothing. `nextUpdate` is
+/// in seconds from now.
+std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUpdate = 3600);
+
+/// A file in the folder for temporary files that goes with its owner.
+class TemporaryFile {
+ public:
+  explicit TemporaryFile(const std::string& content);
+  ~TemporaryFile();
+  TemporaryFile(const TemporaryFile&) = delete;
+  TemporaryFile& operator=(const TemporaryFile&) = delete;
+
+  const std::string& Path() const { return path_; }
+
+ private:
+  std::string path_;
+};
+
+}  // namespace Tarnik::Testing
+
+#endif

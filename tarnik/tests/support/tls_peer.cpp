@@ -1,0 +1,113 @@
+#include "support/tls_peer.h"
+
+#include <openssl/err.h>
+#include <signal.h>
+#include <sys/socket.h>
+#include <sys/time.h>
+
+#include <algorithm>
+#include <stdexcept>
+#include <utility>
+
+namespace Tarnik::Testing {
+namespace {
+
+constexpr time_t kSocketLimitSeconds = 30;
+
+void LimitWaits(int socket) {
+  const timeval limit{kSocketLimitSeconds, 0};
+  setsockopt(socket, SOL_SOCKET, SO_RCVTIMEO, &limit, sizeof(limit));
+  setsockopt(socket, SOL_SOCKET, SO_SNDTIMEO, &limit, sizeof(limit));
+}
+
+// OpenSSL writes to sockets in a way that raises SIGPIPE when the peer has gone.
+void IgnoreBrokenPipes() {
+  sigset_t brokenPipe;
+  sigemptyset(&brokenPipe);
+  sigaddset(&brokenPipe, SIGPIPE);
+  pthread_sigmask(SIG_BLOCK, &brokenPipe, nullptr);
+}
+
+void Greet(SSL* ssl) {
+  TlsWrite(ssl, "hello");
+  SSL_shutdown(ssl);
+}
+
+}  // namespace
+
+OpenSsl::OwnedSslContext MakeServerContext(const TlsPeerOptions& options) {
+  OpenSsl::OwnedSslContext context(SSL_CTX_new(TLS_server_method()));
+  SSL_CTX_set_security_level(context.get(), options.securityLevel);
+  const unsigned char sessionContext[] = "test";
+  bool isGood = SSL_CTX_set_min_proto_version(context.get(), options.minVersion) == 1 &&
+                SSL_CTX_set_max_proto_version(context.get(), options.maxVersion) == 1 &&
+                SSL_CTX_set_cipher_list(context.get(), options.ciphers.c_str()) == 1 &&
+                SSL_CTX_set_session_id_context(context.get(), sessionContext, 4) == 1;
+  SSL_CTX_set_dh_auto(context.get(), 1);
+  if (options.identity != nullptr) {
+    isGood = isGood &&
+             SSL_CTX_use_certificate(context.get(), options.identity->certificate.get()) == 1 &&
+             SSL_CTX_use_PrivateKey(context.get(), options.identity->key.get()) == 1;
+  }
+  for (const Identity* issuer : options.chain) {
+    isGood = isGood && SSL_CTX_add1_chain_cert(context.get(), issuer->certificate.get()) == 1;
+  }
+  if (!isGood) {
+    throw std::runtime_error("cannot set up the test's TLS server");
+  }
+  return context;
+}
+
+TlsServer::TlsServer(const TlsPeerOptions& options, int connections, Handler serve)
+    : context_(MakeServerContext(options)),
+      serve_(serve ? std::move(serve) : Greet),
+      thread_([this, connections] { Serve(connections); }) {}
+
+const std::vector<TlsServer::Connection>& TlsServer::Join() {
+  if (thread_.joinable()) {
+    thread_.join();
+  }
+  return served_;
+}
+
+void TlsServer::Serve(int connections) {
+  IgnoreBrokenPipes();
+  for (int i = 0; i < connections; ++i) {
+    const Descriptor socket = listener_.Accept();
+    LimitWaits(socket.Get());
+    ERR_clear_error();
+    const OpenSsl::OwnedSsl ssl(SSL_new(context_.get()));
+    SSL_set_fd(ssl.get(), socket.Get());
+    Connection connection;
+    connection.accepted = SSL_accept(ssl.get()) == 1;
+    connection.resumed = SSL_session_reused(ssl.get()) == 1;
+    const char* serverName = SSL_get_servername(ssl.get(), TLSEXT_NAMETYPE_host_name);
+    connection.serverName = serverName == nullptr ? "" : serverName;
+    served_.push_back(connection);
+    if (connection.accepted) {
+      serve_(ssl.get());
+    }
+  }
+  ERR_clear_error();
+}
+
+bool TlsWrite(SSL* ssl, const std::string& data) {
+  std::size_t written = 0;
+  return data.empty() || SSL_write_ex(ssl, data.data(), data.size(), &written) == 1;
+}
+
+std::string TlsReadExactly(SSL* ssl, std::size_t size) {
+  std::string data(size, '\0');
+  std::size_t received = 0;
+  while (received < size) {
+    std::size_t now = 0;
+    if (SSL_read_ex(ssl, data.data() + received, size - received, &now) != 1) {
+      break;
+    }
+    received += now;
+  }
+  data.resize(received);
+  return data;
+}
+
+}  // namespace Tarnik::Testing

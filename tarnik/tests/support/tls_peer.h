@@ -1,0 +1,65 @@
+#ifndef TARNIK_TESTS_SUPPORT_TLS_PEER_H
+#define TARNIK_TESTS_SUPPORT_TLS_PEER_H
+
+#include <functional>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "support/loopback.h"
+#include "support/openssl.h"
+#include "support/test_pki.h"
+
+namespace Tarnik::Testing {
+
+/// How the server's side of a TLS connection behaves. It is OpenSSL itself, used directly.
+struct TlsPeerOptions {
+  /// None presents no certificate, as for anonymous suites.
+  const Identity* identity = nullptr;
+  /// Sent after the identity's own certificate.
+  std::vector<const Identity*> chain = {};
+  int minVersion = TLS1_2_VERSION;
+  int maxVersion = TLS1_3_VERSION;
+  std::string ciphers = "DEFAULT";
+  int securityLevel = 2;
+};
+
+OpenSsl::OwnedSslContext MakeServerContext(const TlsPeerOptions& options);
+
+/// A TLS server on the loopback interface that serves one connection after the other.
+class TlsServer {
+ public:
+  struct Connection {
+    bool accepted = false;
+    bool resumed = false;
+    std::string serverName;
+  };
+  using Handler = std::function<void(SSL*)>;
+
+  /// `serve` runs after each handshake that succeeds; empty says "hello" and closes in order.
+  TlsServer(const TlsPeerOptions& options, int connections, Handler serve = {});
+  ~TlsServer() { Join(); }
+  TlsServer(const TlsServer&) = delete;
+  TlsServer& operator=(const TlsServer&) = delete;
+
+  int Port() const { return listener_.Port(); }
+  /// What the server has seen, once all connections have been served.
+  const std::vector<Connection>& Join();
+
+ private:
+  void Serve(int connections);
+
+  LoopbackListener listener_;
+  OpenSsl::OwnedSslContext context_;
+  Handler serve_;
+  std::vector<Connection> served_;
+  std::thread thread_;
+};
+
+/// All bytes of `data` by one or more `SSL_write`; false when the peer has gone.
+bool TlsWrite(SSL* ssl, const std::string& data);
+std::string TlsReadExactly(SSL* ssl, std::size_t size);
+
+}  // namespace Tarnik::Testing
+
+#endif
