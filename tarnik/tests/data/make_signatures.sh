@@ -113,7 +113,8 @@ sed 's/$/\r/' "$out/valid-line-ends.xml" > "$work/line-ends.xml"
 mv "$work/line-ends.xml" "$out/valid-line-ends.xml"
 
 usual
-subject='<p:Subject xmlns:p="urn:'"'x'"'&amp;y" p:a="&lt;&quot;&gt;&amp;">]]&gt;"</p:Subject>'
+# No ampersand: libxml2 keeps a reference to one in a namespace URI as it was written.
+subject='<p:Subject xmlns:p="urn:'"'x'"'y" p:a="&lt;&quot;&gt;&amp;">]]&gt;"</p:Subject>'
 assertion | sign signer valid-namespace-with-apostrophes.xml
 
 usual
