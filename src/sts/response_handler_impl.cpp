@@ -12,6 +12,7 @@
 
 #include "sts/response_elements.h"
 #include "sts/soap_fault.h"
+#include "token/saml_names.h"
 #include "xml/namespaces.h"
 
 namespace SsoClient {
@@ -120,7 +121,7 @@ std::string ReadNegotiatedToken(const ElementNode& response) {
   const auto tokenType = ElementText(response.FirstChildElement("TokenType"));
   if (tokenType != kSamlNamespace) {
     throw SsoException("Invalid token type: " + std::string(tokenType) +
-                       " (expected: " + kSamlNamespace);
+                       " (expected: " + std::string(kSamlNamespace));
   }
   return CanonicalizeElement(assertion);
 }

@@ -1,4 +1,5 @@
 #include "xml/issue_body.h"
+#include "token/saml_names.h"
 
 #include <string>
 
@@ -61,7 +62,7 @@ std::shared_ptr<XMLBaseBuilder> BuildAdviceSet(const std::vector<Advice>& advice
   }
   auto set = MakeCompositeBuilder("rsa-advice", "AdviceSet",
                                   {{"xmlns:rsa-advice", kVendorAdviceNamespace},
-                                   {"xmlns:saml", kSamlNamespace},
+                                   {"xmlns:saml", std::string(kSamlNamespace)},
                                    {"xmlns:xs", kXmlSchemaNamespace},
                                    {"xmlns:xsi", kXmlSchemaInstanceNamespace}});
   for (const auto& entry : advice) {

@@ -23,11 +23,6 @@ inline constexpr char kSoapNamespace[] = "http://schemas.xmlsoap.org/soap/envelo
 inline constexpr char kXmlSchemaNamespace[] = "http://www.w3.org/2001/XMLSchema";
 inline constexpr char kXmlSchemaInstanceNamespace[] = "http://www.w3.org/2001/XMLSchema-instance";
 
-/// The SAML 2.0 assertion namespace, and the token type of SAML 2.0 assertions (Web Services
-/// Security SAML Token Profile 1.1 tells token types apart by other URIs; security token services
-/// of WS-Trust 1.3 use this one).
-inline constexpr char kSamlNamespace[] = "urn:oasis:names:tc:SAML:2.0:assertion";
-
 }  // namespace SsoClient
 
 #endif

@@ -46,8 +46,8 @@ class TARNIK_EXPORT Node : public Object {
   Node* NextSibling() const noexcept;
   /// Place in the source document, counted from 1 (columns in bytes); 0 for nodes that were not
   /// parsed.
-  int Line() const noexcept { return line_; }
-  int Column() const noexcept { return column_; }
+  int Line() const noexcept { return static_cast<int>(line_); }
+  int Column() const noexcept { return static_cast<int>(column_); }
 
  protected:
   Node(Tree& tree, NodeKind kind) noexcept : tree_(&tree), column_(0), kind_(kind) {}
