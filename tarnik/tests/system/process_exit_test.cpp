@@ -16,7 +16,12 @@ namespace Tarnik::System {
 namespace {
 
 constexpr std::chrono::seconds kExitLimit{30};
+// ThreadSanitizer sleeps a second at each exit.
+#ifdef __SANITIZE_THREAD__
+constexpr int kRepetitions = 3;
+#else
 constexpr int kRepetitions = 20;
+#endif
 constexpr int kHung = -1;
 constexpr int kNotStarted = -2;
 
