@@ -42,7 +42,7 @@ TEST_F(AcquireTokenTest, TokenCarriesNamesAndGroupsOfTheSubject) {
   const auto token = Acquire();
   SubjectNames names;
   token->GetSubjectNames(names);
-  const auto& user = DevSts::DemoUsers().at(kUser);
+  const DevSts::User user = DevSts::DemoUsers().at(kUser);
   EXPECT_EQ(names.givenName, user.givenName);
   EXPECT_EQ(names.surname, user.surname);
   std::vector<PrincipalId> groups;
@@ -151,15 +151,17 @@ struct SigningCase {
   DevSts::KeyType key;
 };
 
-class SigningAlgorithmTest : public StsTest, public ::testing::WithParamInterface<SigningCase> {};
+class SigningAlgorithmTest : public ::testing::TestWithParam<SigningCase> {};
 
 TEST_P(SigningAlgorithmTest, TokenIsAccepted) {
-  DevSts::AssertionOptions options;
-  options.signing.signature = GetParam().signature;
-  options.signing.digest = GetParam().digest;
-  options.signingKey = GetParam().key;
-  Sts().SetAssertionOptions(options);
-  EXPECT_EQ(Acquire()->Subject().name, "alice");
+  DevSts::ServerOptions options;
+  options.assertion.signing.signature = GetParam().signature;
+  options.assertion.signing.digest = GetParam().digest;
+  options.assertion.signingKey = GetParam().key;
+  const DevSts::Server server(options);
+  const auto token =
+      MakeService(server, server.HttpsUrl())->AcquireToken(kUser, kPassword, TenMinutes());
+  EXPECT_EQ(token->Subject().name, "alice");
 }
 
 using DevSts::DigestAlgorithm;

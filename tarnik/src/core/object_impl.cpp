@@ -28,6 +28,10 @@ long ObjectImpl::RefCount() const noexcept {
   return refCount_.load(std::memory_order_relaxed);
 }
 
+void ObjectImpl::OnFirstRef() const noexcept {}
+
+void ObjectImpl::OnLastRef() const noexcept {}
+
 bool ObjectImpl::IncRefIfAlive() const noexcept {
   long count = refCount_.load(std::memory_order_relaxed);
   while (count > 0) {

@@ -19,6 +19,10 @@ class TARNIK_EXPORT ObjectImpl : public virtual Object {
   /// "<ClassName>" unless overridden.
   std::string ToString() const override;
   long RefCount() const noexcept override;
+  // Without overriders of its own, this class would have empty slots wherever another base of the
+  // object has claimed the shared `Object` (Itanium C++ ABI, section 2.5.2).
+  void OnFirstRef() const noexcept override;
+  void OnLastRef() const noexcept override;
 
  protected:
   ObjectImpl() = default;
