@@ -2,6 +2,9 @@
 
 #include <gmock/gmock.h>
 
+#include <chrono>
+#include <future>
+
 #include "transport/connect_recorder.h"
 #include "transport/fake_ssl.h"
 #include "transport/loopback_server.h"
@@ -100,6 +103,19 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, TheBindingKeepsTheContextUntilTheComp
   EXPECT_EQ(recorder.calls, 1);
   EXPECT_FALSE(recorder.hasError) << recorder.message;
   recorder.lastStream->Close();
+}
+
+using SsoCustomSslConnectionSpecImplDeathTest = SsoCustomSslConnectionSpecImplTest;
+
+TEST_F(SsoCustomSslConnectionSpecImplDeathTest, AnEmptyCompletionFailsOnTheIoThread) {
+  testing::GTEST_FLAG(death_test_style) = "threadsafe";
+  EXPECT_DEATH(
+      {
+        const Testing::LoopbackSocket deaf;  // bound, but nobody listens: refused
+        MakeSpec("127.0.0.1", deaf.Port())->StartConnect(nullptr);
+        std::promise<void>().get_future().wait_for(std::chrono::seconds(20));
+      },
+      "bad_function_call");
 }
 
 }  // namespace
