@@ -78,7 +78,7 @@ Ref<const Certificate> CreateCertificateFromDer(const unsigned char* bytes, std:
   if (auto known = cache.Find({reinterpret_cast<const char*>(bytes), length})) {
     return known;
   }
-  const Ref<const Certificate> certificate(
+  Ref<const Certificate> certificate(
       new CertificateImpl(std::vector<unsigned char>(bytes, bytes + length)));
   cache.Add(certificate);
   return certificate;

@@ -244,7 +244,7 @@ RequestRoute Exchange::Route(bool isSecure) const {
 // RFC 9110, section 7.2: the host and, unless it is the scheme's own, the port.
 std::string Exchange::HostField(bool isSecure) const {
   const bool isIPv6 = host_.find(':') != std::string::npos;
-  const std::string host = isIPv6 ? "[" + host_ + "]" : host_;
+  std::string host = isIPv6 ? "[" + host_ + "]" : host_;
   const std::string& key = place_.endpointKey;
   const auto colon = key.rfind(':');
   const std::string port = colon == std::string::npos ? std::string() : key.substr(colon + 1);

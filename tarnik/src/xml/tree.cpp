@@ -59,7 +59,7 @@ void Tree::Join(Tree& first, Tree& second) noexcept {
 
 std::string_view Tree::Store(std::string_view text) {
   if (text.empty()) {
-    return std::string_view("", 0);
+    return "";
   }
   char* copy = Allocate<char>(text.size());
   std::memcpy(copy, text.data(), text.size());

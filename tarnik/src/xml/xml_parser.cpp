@@ -11,7 +11,7 @@ namespace Tarnik::Xml {
 
 namespace {
 
-constexpr std::size_t kFirstChunkBytes = 16 * 1024;
+constexpr std::size_t kFirstChunkBytes = std::size_t{16} * 1024;
 
 class XMLParserImpl final : public XMLParser, public ObjectImpl {
  public:

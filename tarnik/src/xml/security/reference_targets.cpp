@@ -145,6 +145,7 @@ std::vector<const Node*> FindReferenceTargets(const ElementNode* signature,
     }
   }
   std::vector<const Node*> targets;
+  targets.reserve(references.size());
   std::size_t next = 0;
   for (const Reference& reference : references) {
     targets.push_back(reference.uri.empty() ? root : CarrierOf(searches[next++]));
