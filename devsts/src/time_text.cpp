@@ -52,8 +52,9 @@ std::string TimeToText(Time time) {
 }
 
 std::optional<Time> TimeFromText(std::string_view text) {
-  static const std::regex kForm(
-      R"((\d{4})-(\d\d)-(\d\d)T(\d\d):(\d\d):(\d\d)(?:\.(\d+))?(Z|[+-]\d\d:\d\d))");
+  // Never destroyed: a server may still answer while the process's static objects die.
+  static const std::regex& kForm =
+      *new std::regex(R"((\d{4})-(\d\d)-(\d\d)T(\d\d):(\d\d):(\d\d)(?:\.(\d+))?(Z|[+-]\d\d:\d\d))");
   std::match_results<std::string_view::const_iterator> match;
   if (text.size() > 64 || !std::regex_match(text.begin(), text.end(), match, kForm)) {
     return std::nullopt;
