@@ -12,10 +12,7 @@ using Tarnik::Xml::ElementNode;
 std::string_view ReadValue(ChildCursor& cursor) {
   const ElementNode& element = ExpectElement(cursor.Current(), "AttributeValue", kSamlNamespace);
   CheckEachAttribute(element, {}, {kTypeAttribute});
-  // The value is text whatever its type, but a type that cannot be named is no type.
-  if (const auto type = FindTypeAttribute(element)) {
-    ResolveQNameValue(element, *type);
-  }
+  CheckTypeIsNameable(element);
   const std::string_view value = ReadTextContent(element);
   cursor.Advance();
   return value;

@@ -32,6 +32,10 @@ void CheckEachAttribute(const Tarnik::Xml::ElementNode& element,
 /// The value of xsi:type, or none.
 std::optional<std::string_view> FindTypeAttribute(const Tarnik::Xml::ElementNode& element);
 
+/// For elements that are read the same way whatever type they name: throws `ParseException` when
+/// xsi:type is there with a prefix that nothing binds, since a type that cannot be named is none.
+void CheckTypeIsNameable(const Tarnik::Xml::ElementNode& element);
+
 /// The readers below take the attribute of this qualified name and throw `ParseException` when it
 /// is missing or its value is not of the kind that they read.
 std::string_view ReadAttribute(const Tarnik::Xml::ElementNode& element, std::string_view name);

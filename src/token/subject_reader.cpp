@@ -78,7 +78,8 @@ void ReadHolderOfKeyData(const ElementNode& data, ChildCursor& children, ParsedS
 }
 
 void ReadBearerData(const ElementNode& data, const ChildCursor& children, ParsedSubject& subject) {
-  CheckEachAttribute(data, {{"", "NotOnOrAfter"}});
+  CheckEachAttribute(data, {{"", "NotOnOrAfter"}}, {kTypeAttribute});
+  CheckTypeIsNameable(data);
   subject.notOnOrAfter = ReadDateAttribute(data, "NotOnOrAfter");
   ExpectEmpty(children);
 }

@@ -78,6 +78,21 @@ TEST(CheckEachAttribute, NamesTheOneTooMany) {
             "Unexpected attribute 'saml2:Count' on element 'saml2:A'");
 }
 
+TEST(CheckTypeIsNameable, AcceptsNoTypeAndTypesOfBoundPrefixes) {
+  for (const char* content :
+       {"<saml2:A/>", R"(<saml2:A xsi:type="xs:string"/>)", R"(<saml2:A xsi:type="string"/>)",
+        R"(<saml2:A type="no:string"/>)"}) {
+    const Fragment fragment(content);
+    EXPECT_NO_THROW(CheckTypeIsNameable(fragment.Element())) << content;
+  }
+}
+
+TEST(CheckTypeIsNameable, RejectsATypeOfAnUnboundPrefix) {
+  const Fragment fragment("\n<saml2:A xsi:type=\"no:string\"/>");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CheckTypeIsNameable(fragment.Element()); }),
+            "Element saml2:Aat 2,1 uses undefined prefix: `no'");
+}
+
 TEST(ReadAttribute, GivesTheValueOrNamesTheMissingOne) {
   const Fragment fragment(R"(<saml2:A a="x &amp; y"/>)");
   EXPECT_EQ(ReadAttribute(fragment.Element(), "a"), "x & y");

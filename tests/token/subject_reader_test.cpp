@@ -194,13 +194,40 @@ TEST(ReadSubject, PassesThePlatformsFaultsOfACertificate) {
                Tarnik::Crypto::CryptoException);
 }
 
+TEST(ReadSubject, LetsBearerDataNameItsType) {
+  for (const char* type :
+       {"saml2:SubjectConfirmationDataType", "saml2:KeyInfoConfirmationDataType", "Untyped"}) {
+    const ParsedSubject subject =
+        Read(Replaced(BearerText(), "Z\"/>", std::string("Z\" xsi:type=\"") + type + "\"/>"));
+    EXPECT_EQ(subject.confirmationMethod, BEARER) << type;
+    EXPECT_EQ(subject.notOnOrAfter.ToString(), "2024-03-05T08:00:00.000Z") << type;
+    EXPECT_EQ(subject.holderOfKeyCertificate, nullptr) << type;
+  }
+}
+
+TEST(ReadSubject, RefusesBearerDataOfATypeThatCannotBeNamed) {
+  const std::string text = "\n" + Replaced(BearerText(), "Z\"/>", "Z\" xsi:type=\"unbound:T\"/>");
+  const std::size_t lineStart = 1;
+  EXPECT_EQ(Refusal(text),
+            "Element saml2:SubjectConfirmationDataat 2," +
+                std::to_string(text.find("<saml2:SubjectConfirmationData ") - lineStart + 1) +
+                " uses undefined prefix: `unbound'");
+}
+
+// A type that calls for a key does not make room for one.
+TEST(ReadSubject, RefusesABearerKeyWhateverTheType) {
+  EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), "cm:holder-of-key", "cm:bearer")),
+            "Element 'saml2:SubjectConfirmationData' must be empty");
+}
+
 TEST(ReadSubject, RefusesBearerDataThatSaysMore) {
   const std::string end = "Z\"/>";
   EXPECT_EQ(Refusal(Replaced(BearerText(), end, "Z\" Recipient=\"urn:r\"/>")),
             "Unexpected attribute 'Recipient' on element 'saml2:SubjectConfirmationData'");
-  EXPECT_EQ(
-      Refusal(Replaced(BearerText(), end, "Z\" xsi:type=\"saml2:KeyInfoConfirmationDataType\"/>")),
-      "Unexpected attribute 'xsi:type' on element 'saml2:SubjectConfirmationData'");
+  EXPECT_EQ(Refusal(Replaced(BearerText(), end, "Z\" type=\"saml2:T\"/>")),
+            "Unexpected attribute 'type' on element 'saml2:SubjectConfirmationData'");
+  EXPECT_EQ(Refusal(Replaced(BearerText(), end, "Z\" xsi:nil=\"true\"/>")),
+            "Unexpected attribute 'xsi:nil' on element 'saml2:SubjectConfirmationData'");
   EXPECT_EQ(
       Refusal(Replaced(BearerText(), end, "Z\"><ds:KeyInfo/></saml2:SubjectConfirmationData>")),
       "Element 'saml2:SubjectConfirmationData' must be empty");
