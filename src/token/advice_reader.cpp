@@ -15,7 +15,8 @@ namespace {
 using Tarnik::Xml::ElementNode;
 
 AdviceAttribute ReadAdviceAttribute(ChildCursor& cursor) {
-  const AttributeView view = ReadSamlAttribute(cursor);
+  // A request may ask for advice with empty values: the token that carries them must be readable.
+  const AttributeView view = ReadSamlAttribute(cursor, EmptyValues::kRead);
   return {std::string(view.name), {view.values.begin(), view.values.end()}};
 }
 

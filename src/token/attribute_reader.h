@@ -16,8 +16,16 @@ struct AttributeView {
   std::vector<std::string_view> values;
 };
 
-/// Reads an Attribute and its AttributeValue children. Throws `ParseException`.
-AttributeView ReadSamlAttribute(ChildCursor& cursor);
+/// What becomes of an AttributeValue without any content.
+enum class EmptyValues {
+  kRefused,
+  kRead,  ///< as the empty text
+};
+
+/// Reads an Attribute and its AttributeValue children, each of which holds text alone. Throws
+/// `ParseException`.
+AttributeView ReadSamlAttribute(ChildCursor& cursor,
+                                EmptyValues emptyValues = EmptyValues::kRefused);
 
 }  // namespace SsoClient
 

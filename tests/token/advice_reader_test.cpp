@@ -32,6 +32,20 @@ TEST(ReadAdvice, ReadsBlocksAttributesAndValuesInOrder) {
   EXPECT_TRUE(fragment.Cursor().IsAtElement("next"));
 }
 
+TEST(ReadAdvice, ReadsEmptyValuesAndNames) {
+  Fragment fragment(
+      R"(<saml2:Advice><rsa:RSAAdvice AdviceSource="urn:s"><saml2:Attribute Name="">)"
+      R"(<saml2:AttributeValue xsi:type="xs:string"></saml2:AttributeValue>)"
+      R"(<saml2:AttributeValue xsi:type="xs:string"> </saml2:AttributeValue>)"
+      R"(<saml2:AttributeValue xsi:type="xs:string"/></saml2:Attribute></rsa:RSAAdvice>)"
+      R"(</saml2:Advice>)");
+  const std::vector<Advice> advice = ReadAdvice(fragment.Cursor());
+  ASSERT_EQ(advice.size(), 1U);
+  ASSERT_EQ(advice[0].attributes.size(), 1U);
+  EXPECT_EQ(advice[0].attributes[0].name, "");
+  EXPECT_EQ(advice[0].attributes[0].values, (std::vector<std::string>{"", " ", ""}));
+}
+
 TEST(ReadAdvice, ReadsNoAdvice) {
   Fragment fragment("<saml2:Advice/>");
   EXPECT_TRUE(ReadAdvice(fragment.Cursor()).empty());

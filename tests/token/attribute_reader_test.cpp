@@ -11,6 +11,10 @@ namespace {
 using TestSupport::Fragment;
 using TestSupport::ThrownMessage;
 
+constexpr char kTextOnly[] =
+    "Element 'saml2:AttributeValue' must only have textual content (but has extra children or is "
+    "empty).";
+
 TEST(ReadSamlAttribute, ReadsNamesAndValuesInOrder) {
   Fragment fragment(
       R"(<saml2:Attribute Name="n" NameFormat="f" FriendlyName="g">)"
@@ -32,12 +36,32 @@ TEST(ReadSamlAttribute, LeavesAbsentNamesEmpty) {
   EXPECT_TRUE(attribute.values.empty());
 }
 
+TEST(ReadSamlAttribute, ReadsEmptyValuesOnlyWhenToldTo) {
+  const std::string text =
+      R"(<saml2:Attribute Name="n"><saml2:AttributeValue xsi:type="xs:string"/>)"
+      R"(<saml2:AttributeValue>a</saml2:AttributeValue>)"
+      R"(<saml2:AttributeValue></saml2:AttributeValue></saml2:Attribute>)";
+  Fragment read(text);
+  EXPECT_EQ(ReadSamlAttribute(read.Cursor(), EmptyValues::kRead).values,
+            (std::vector<std::string_view>{"", "a", ""}));
+  Fragment refused(text);
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadSamlAttribute(refused.Cursor()); }), kTextOnly);
+}
+
+TEST(ReadSamlAttribute, TakesOnlyAValueWithoutContentForEmpty) {
+  for (const char* content : {"<!---->", "<?p?>", "<x/>", "<!---->a"}) {
+    Fragment fragment(std::string("<saml2:Attribute Name=\"n\"><saml2:AttributeValue>") + content +
+                      "</saml2:AttributeValue></saml2:Attribute>");
+    EXPECT_EQ(ThrownMessage<ParseException>(
+                  [&] { ReadSamlAttribute(fragment.Cursor(), EmptyValues::kRead); }),
+              kTextOnly)
+        << content;
+  }
+}
+
 TEST(ReadSamlAttribute, RefusesByTheReadingRules) {
   const std::string open = "<saml2:Attribute Name=\"n\">";
   const std::string close = "</saml2:Attribute>";
-  const std::string textOnly =
-      "Element 'saml2:AttributeValue' must only have textual content (but has extra children or is "
-      "empty).";
   const std::pair<std::string, std::string> cases[] = {
       {"<saml2:Attribute/>", "Node 'saml2:Attribute is missing required attribute 'Name'"},
       {"<saml2:Attribute Name=\"n\" x=\"\"/>",
@@ -48,10 +72,10 @@ TEST(ReadSamlAttribute, RefusesByTheReadingRules) {
       {open + "<x/>" + close, "Expected element 'AttributeValue' not found."},
       {open + "<AttributeValue>v</AttributeValue>" + close,
        "Element 'AttributeValue' has unexpected namespace"},
-      {open + "<saml2:AttributeValue/>" + close, textOnly},
-      {open + "<saml2:AttributeValue><x/></saml2:AttributeValue>" + close, textOnly},
-      {open + "<saml2:AttributeValue>a<!---->b</saml2:AttributeValue>" + close, textOnly},
-      {open + "<saml2:AttributeValue>a<?p?>b</saml2:AttributeValue>" + close, textOnly},
+      {open + "<saml2:AttributeValue/>" + close, kTextOnly},
+      {open + "<saml2:AttributeValue><x/></saml2:AttributeValue>" + close, kTextOnly},
+      {open + "<saml2:AttributeValue>a<!---->b</saml2:AttributeValue>" + close, kTextOnly},
+      {open + "<saml2:AttributeValue>a<?p?>b</saml2:AttributeValue>" + close, kTextOnly},
       {open + "<saml2:AttributeValue xsi:nil=\"1\">v</saml2:AttributeValue>" + close,
        "Unexpected attribute 'xsi:nil' on element 'saml2:AttributeValue'"},
       {open + "<saml2:AttributeValue type=\"xs:string\">v</saml2:AttributeValue>" + close,

@@ -119,6 +119,15 @@ TEST(ReadAttributeStatement, LeavesAttributesOfOtherNames) {
   EXPECT_EQ(attributes.names.surname, "");
 }
 
+TEST(ReadAttributeStatement, RefusesEmptyValues) {
+  for (const std::string name :
+       {kGroupIdentityAttribute, kIsSolutionAttribute, kSurname, "urn:other"}) {
+    EXPECT_EQ(Refusal(AttributeText(name, {""})),
+              "Element 'saml2:AttributeValue' must only have textual content (but has extra "
+              "children or is empty).");
+  }
+}
+
 TEST(ReadAttributeStatement, RefusesByTheReadingRules) {
   EXPECT_EQ(Refusal("<saml2:EncryptedAttribute/>"), "Expected element 'Attribute' not found.");
   EXPECT_EQ(Refusal("text"), "Expected element 'Attribute' not found.");
