@@ -12,6 +12,7 @@ namespace {
 
 using Tarnik::DatePrintFormatter;
 using Tarnik::Detail::ASPrintInternal;
+using Tarnik::System::DateTime;
 
 // A separator stands in front of an item once anything was written before, so items that are
 // described by an empty text leave no trace.
@@ -81,13 +82,19 @@ std::string CreateSamlTokenDescription(const SamlToken& token) {
   token.GetGroups(groups);
   std::vector<Delegate> delegationChain;
   token.GetDelegationChain(delegationChain);
+  const DateTime& startTime = token.StartTime();
+  const DateTime& expirationTime = token.ExpirationTime();
+  const PrincipalId* subject = &token.Subject();
+  const bool isRenewable = token.IsRenewable();
+  const bool isDelegable = token.IsDelegable();
+  const bool isSolution = token.IsSolution();
+  const auto confirmationType = static_cast<std::int32_t>(token.ConfirmationType());
   return ASPrintInternal(
       "SamlToken [subject=%1, groups=[%2], delegationChain=[%3], startTime=%4, expirationTime=%5, "
       "renewable=%6, delegable=%7, isSolution=%8,confirmationType=%9]",
-      {Describe(&token.Subject()), JoinByLength(groups), JoinByLength(delegationChain),
-       DatePrintFormatter(token.StartTime()), DatePrintFormatter(token.ExpirationTime()),
-       token.IsRenewable(), token.IsDelegable(), token.IsSolution(),
-       static_cast<std::int32_t>(token.ConfirmationType())});
+      {Describe(subject), JoinByLength(groups), JoinByLength(delegationChain),
+       DatePrintFormatter(startTime), DatePrintFormatter(expirationTime), isRenewable, isDelegable,
+       isSolution, confirmationType});
 }
 
 }  // namespace SsoClient
