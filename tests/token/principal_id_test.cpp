@@ -1,5 +1,10 @@
 #include <ssoclient/principal_id.h>
 
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include <new>
+
 namespace SsoClient {
 namespace {
 
@@ -20,6 +25,20 @@ TEST(PrincipalId, EqualsItself) {
   const PrincipalId principal{"alice", "a"};
   const PrincipalId& same = principal;
   EXPECT_TRUE(principal == same);
+}
+
+// The object stands on a page that no one may read while it is compared.
+TEST(PrincipalId, EqualsItselfWithoutALookAtItsStrings) {
+  const auto pageSize = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
+  void* page = mmap(nullptr, pageSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  ASSERT_NE(page, MAP_FAILED);
+  auto* principal = new (page) PrincipalId{"alice", "a"};
+  ASSERT_EQ(mprotect(page, pageSize, PROT_NONE), 0);
+  const PrincipalId& same = *principal;
+  EXPECT_TRUE(*principal == same);
+  ASSERT_EQ(mprotect(page, pageSize, PROT_READ | PROT_WRITE), 0);
+  principal->~PrincipalId();
+  munmap(page, pageSize);
 }
 
 TEST(PrincipalId, StopsAtTheFirstNul) {
