@@ -69,6 +69,31 @@ TEST(CreateSamlToken, AcceptsAnRsaSignatureOverTheWholeDocument) {
   EXPECT_EQ(CreateSamlToken(xml, resolver.get())->Subject().name, "alice");
 }
 
+// Signed with a reference to the assertion and one to the whole document.
+std::string TwiceReferencedXml() {
+  AssertionText text;
+  std::string& signature = text.signature;
+  signature = Replaced(signature, "AAECAwQFBgcICQoLDA0ODxAREhMUFRYXGBkaGxwdHh8=", "");
+  signature = Replaced(signature, "AAECAwQF", "");
+  const std::size_t begin = signature.find("<ds:Reference ");
+  const std::size_t end = signature.find("</ds:SignedInfo>");
+  signature.insert(end, Replaced(signature.substr(begin, end - begin), "\"#_a1\"", "\"\""));
+  const DevSts::Credential& credential = TestSupport::TrustedCredential();
+  return DevSts::SignXml(text.ToXml(), credential.privateKeyPem, credential.certificatePem);
+}
+
+TEST(CreateSamlToken, VerifiesEveryReferenceThoughOneCoversTheToken) {
+  const std::string xml = TwiceReferencedXml();
+  const auto resolver = TestSupport::TrustedResolver();
+  EXPECT_EQ(CreateSamlToken(xml, resolver.get())->Subject().name, "alice");
+  const auto inside = ParseXml("<wrapper>" + xml + "</wrapper>");
+  ElementNode* assertion = TestSupport::FindElement(inside->RootElement(), "Assertion");
+  EXPECT_EQ(CreateSamlTokenFromDom(assertion)->Subject().name, "alice");
+  EXPECT_EQ(ThrownMessage<InvalidSignatureException>(
+                [&] { CreateSamlTokenFromDom(assertion, resolver.get()); }),
+            kTampered);
+}
+
 TEST(CreateSamlToken, ChecksTheSignaturesFormAloneWithoutAResolver) {
   const std::string xml = TamperedXml();
   EXPECT_EQ(CreateSamlToken(xml)->Subject().name, "admin");

@@ -123,6 +123,22 @@ TEST(SamlTokenImpl, IsRenewableAndDelegableByCountsOtherThanZero) {
   }
 }
 
+TEST(SamlTokenImpl, IsDelegableWithoutADelegationChain) {
+  AssertionText text(kNow);
+  const auto chainLength = [](const SamlToken& token) {
+    std::vector<Delegate> chain(1);
+    token.GetDelegationChain(chain);
+    return chain.size();
+  };
+  EXPECT_TRUE(MakeToken(text)->IsDelegable());
+  EXPECT_EQ(chainLength(*MakeToken(text)), 0U);
+  text.conditions = Replaced(text.conditions, "<saml2:ProxyRestriction Count=\"10\"/>", "");
+  EXPECT_FALSE(MakeToken(text)->IsDelegable());
+  EXPECT_EQ(chainLength(*MakeToken(text)), 0U);
+  EXPECT_FALSE(MakeToken(text.Delegate())->IsDelegable());
+  EXPECT_EQ(chainLength(*MakeToken(text)), 2U);
+}
+
 TEST(SamlTokenImpl, IsASolutionWhenItsAttributeSaysSo) {
   AssertionText text(kNow);
   text.attributeStatement = Replaced(text.attributeStatement, ">false<", ">True<");
