@@ -8,11 +8,13 @@
 
 namespace SsoClient {
 
-/// Creates tokens for those who do not know the keys. Safe from many threads. The order of the
-/// operations is part of the binary interface.
+/// Creates tokens for those who do not know the keys. Owned through `std::shared_ptr`, which
+/// deletes the implementation. Implementations must be safe to use from many threads. The order of
+/// the operations is part of the binary interface.
 class SamlTokenFactory {
  public:
-  /// As the function `CreateSamlToken`, with a tolerance of 600 seconds where none is given.
+  /// As the function `CreateSamlToken`, with a tolerance of 600 seconds where none is given, and
+  /// throws what it throws.
   virtual std::shared_ptr<const SamlToken> CreateToken(const std::string& xml) const = 0;
   virtual std::shared_ptr<const SamlToken> CreateToken(const std::string& xml,
                                                        long clockToleranceSec) const = 0;
