@@ -20,6 +20,7 @@ void TextNode::SetText(std::string_view text) {
   const std::string_view stored = tree_->Store(text);
   text_ = stored.data();
   length_ = stored.size();
+  hasCDataSection_ = 0;
 }
 
 void CreateTextNode(Ref<TextNode>& text) {

@@ -41,6 +41,7 @@ class DocumentHandler final : public XMLHandler, public ObjectImpl {
   void ProcessingInstruction(const Position& position, std::string_view target,
                              std::string_view text) override;
   Ref<Object> EndDocument() override;
+  void StartCDataSection(const Position& position) override;
 
  private:
   struct ExpandedName {
@@ -73,6 +74,7 @@ class DocumentHandler final : public XMLHandler, public ObjectImpl {
   NamespaceScope scope_;
   std::string pendingText_;
   Position pendingPosition_{};
+  bool pendingCDataSection_ = false;
   std::vector<ExpandedName> expandedNames_;
 };
 
@@ -89,10 +91,15 @@ void DocumentHandler::Add(Node* node, const Position& position) noexcept {
 }
 
 void DocumentHandler::FlushText() {
+  const bool hasCDataSection = std::exchange(pendingCDataSection_, false);
   if (pendingText_.empty()) {
     return;
   }
-  Add(TreeBuilder::NewText(*tree_, pendingText_), pendingPosition_);
+  TextNode* text = TreeBuilder::NewText(*tree_, pendingText_);
+  if (hasCDataSection) {
+    TreeBuilder::MarkCDataSection(*text);
+  }
+  Add(text, pendingPosition_);
   pendingText_.clear();
 }
 
@@ -152,6 +159,11 @@ void DocumentHandler::Characters(const Position& position, std::string_view text
     pendingPosition_ = position;
   }
   pendingText_.append(text);
+}
+
+void DocumentHandler::StartCDataSection(const Position&) {
+  Current();
+  pendingCDataSection_ = true;
 }
 
 void DocumentHandler::Comment(const Position& position, std::string_view text) {

@@ -41,6 +41,7 @@ ExpatSession::ExpatSession(XMLHandler& handler)
   XML_SetStartDoctypeDeclHandler(parser, OnDoctype);
   XML_SetElementHandler(parser, OnStartElement, OnEndElement);
   XML_SetCharacterDataHandler(parser, OnCharacters);
+  XML_SetStartCdataSectionHandler(parser, OnStartCDataSection);
   XML_SetCommentHandler(parser, OnComment);
   XML_SetProcessingInstructionHandler(parser, OnProcessingInstruction);
 }
@@ -179,6 +180,11 @@ void ExpatSession::OnCharacters(void* session, const char* text, int length) {
   self->Handle([=](const Position& position) {
     self->handler_.Characters(position, {text, static_cast<std::size_t>(length)});
   });
+}
+
+void ExpatSession::OnStartCDataSection(void* session) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) { self->handler_.StartCDataSection(position); });
 }
 
 void ExpatSession::OnComment(void* session, const char* text) {

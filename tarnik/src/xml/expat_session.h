@@ -36,6 +36,7 @@ class ExpatSession {
   static void OnStartElement(void* session, const char* name, const char** attributes);
   static void OnEndElement(void* session, const char* name);
   static void OnCharacters(void* session, const char* text, int length);
+  static void OnStartCDataSection(void* session);
   static void OnComment(void* session, const char* text);
   static void OnProcessingInstruction(void* session, const char* target, const char* text);
 

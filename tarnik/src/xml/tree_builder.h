@@ -34,6 +34,8 @@ class TreeBuilder {
     return node;
   }
 
+  static void MarkCDataSection(TextNode& text) noexcept { text.hasCDataSection_ = 1; }
+
   static CommentNode* NewComment(Tree& tree, std::string_view text) {
     auto* node = new (tree.Allocate<CommentNode>()) CommentNode(tree, NodeKind::kComment);
     const std::string_view stored = tree.Store(text);
@@ -89,9 +91,9 @@ class TreeBuilder {
   }
 
   static void SetPosition(Node& node, const Position& position) noexcept {
-    constexpr unsigned long kMaxColumn = (1UL << 24) - 1;
+    constexpr unsigned long kMaxColumn = (1UL << 23) - 1;
     node.line_ = static_cast<unsigned>(position.line);
-    node.column_ = static_cast<unsigned>(std::min(position.column, kMaxColumn)) & 0xFFFFFFU;
+    node.column_ = static_cast<unsigned>(std::min(position.column, kMaxColumn)) & 0x7FFFFFU;
   }
 
   static const InternedName& NameOf(const ElementNode& element) noexcept { return *element.name_; }

@@ -69,6 +69,33 @@ TEST(DocumentHandlerTest, JoinsAdjacentCharacterDataAndCdataToOneText) {
   EXPECT_EQ(text->NextSibling(), nullptr);
 }
 
+bool FirstTextHasCDataSection(const std::string& xml) {
+  const Ref<Document> document = ParseXml(xml);
+  const Node* text = document->RootElement()->FirstChild();
+  while (text->Kind() != NodeKind::kText) {
+    text = text->NextSibling();
+  }
+  return static_cast<const TextNode*>(text)->HasCDataSection();
+}
+
+TEST(DocumentHandlerTest, TellsTextsThatHaveACDataSection) {
+  for (const char* xml : {"<r><![CDATA[a]]></r>", "<r>a<![CDATA[b]]></r>", "<r><![CDATA[a]]>b</r>",
+                          "<r>a<![CDATA[]]></r>", "<r><![CDATA[]]>a</r>"}) {
+    EXPECT_TRUE(FirstTextHasCDataSection(xml)) << xml;
+  }
+  for (const char* xml : {"<r>a</r>", "<r><![CDATA[]]><b/>a</r>", "<r>a<b><![CDATA[b]]></b></r>",
+                          "<r><![CDATA[]]><!---->a</r>", "<r>a&lt;![CDATA[b]]&gt;</r>"}) {
+    EXPECT_FALSE(FirstTextHasCDataSection(xml)) << xml;
+  }
+}
+
+TEST(DocumentHandlerTest, ForgetsTheCDataSectionOfATextThatIsSetAnew) {
+  const Ref<Document> document = ParseXml("<r><![CDATA[a]]></r>");
+  auto* text = static_cast<TextNode*>(document->RootElement()->FirstChild());
+  text->SetText("b");
+  EXPECT_FALSE(text->HasCDataSection());
+}
+
 TEST(DocumentHandlerTest, KeepsCommentsBetweenTexts) {
   const Ref<Document> document = ParseXml("<r>admin<!---->.evil</r>");
   const Node* first = document->RootElement()->FirstChild();

@@ -11,7 +11,10 @@ namespace Tarnik::Xml {
 class TARNIK_EXPORT TextNode final : public Node {
  public:
   std::string_view Text() const noexcept { return {text_, length_}; }
-  /// Sets the text. Throws `InvalidArgumentException` for what XML 1.0 cannot carry (section 2.2).
+  /// True when a CDATA section, be it an empty one, is part of the text in the parsed document.
+  bool HasCDataSection() const noexcept { return hasCDataSection_ != 0; }
+  /// Sets the text, which has no CDATA section. Throws `InvalidArgumentException` for what XML 1.0
+  /// cannot carry (section 2.2).
   void SetText(std::string_view text);
 
  private:

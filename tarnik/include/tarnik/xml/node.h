@@ -50,7 +50,8 @@ class TARNIK_EXPORT Node : public Object {
   int Column() const noexcept { return static_cast<int>(column_); }
 
  protected:
-  Node(Tree& tree, NodeKind kind) noexcept : tree_(&tree), column_(0), kind_(kind) {}
+  Node(Tree& tree, NodeKind kind) noexcept
+      : tree_(&tree), column_(0), hasCDataSection_(0), kind_(kind) {}
   ~Node() override = default;
 
  private:
@@ -64,7 +65,8 @@ class TARNIK_EXPORT Node : public Object {
   ParentNode* parent_ = nullptr;
   Node* next_ = nullptr;  // the last child points at the first
   unsigned line_ = 0;
-  unsigned column_ : 24;
+  unsigned column_ : 23;
+  unsigned hasCDataSection_ : 1;  // of a text
   NodeKind kind_;
 };
 

@@ -35,6 +35,8 @@ class TARNIK_EXPORT XMLHandler : public virtual Object {
                                      std::string_view text) = 0;
   /// The end of a well-formed document; gives what the handler has made of it.
   virtual Ref<Object> EndDocument() = 0;
+  /// The start of a CDATA section, whose characters come as any other. Does nothing by default.
+  virtual void StartCDataSection(const Position&) {}
 };
 
 /// A handler that builds a `Document` and checks what Namespaces in XML 1.0 demands: every prefix

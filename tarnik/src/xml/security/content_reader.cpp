@@ -116,7 +116,12 @@ std::string TextOf(const ElementNode* element) {
     if (node->Kind() != NodeKind::kText) {
       Refuse(element, "may hold nothing but text");
     }
-    text.append(static_cast<const TextNode*>(node)->Text());
+    const auto* part = static_cast<const TextNode*>(node);
+    // Other readers see a CDATA section as a node of its own, and may take the first for the whole.
+    if (part->HasCDataSection()) {
+      Refuse(element, "may not hold a CDATA section");
+    }
+    text.append(part->Text());
   }
   return std::string(Trim(text));
 }

@@ -47,8 +47,8 @@ class ContentReader {
 void ExpectAttributes(const ElementNode* element, std::initializer_list<std::string_view> names);
 /// The value of the "Algorithm" attribute; no other attribute is allowed.
 std::string AlgorithmOf(const ElementNode* element);
-/// The text of an element without attributes that holds only text, without the white space around
-/// it.
+/// The text of an element without attributes that holds only text and no CDATA section, without the
+/// white space around it.
 std::string TextOf(const ElementNode* element);
 /// The bytes that the element's text gives in Base64 (XML Schema Part 2, section 3.2.16); at least
 /// one.

@@ -61,6 +61,14 @@ std::string Twice(std::string_view element) {
   return text.insert(start, copy);
 }
 
+// The good document with the whole value in a CDATA section, which its canonical form ignores.
+std::string InCData(const std::string& localName) {
+  const std::string open = "<ds:" + localName + ">";
+  const std::string close = "</ds:" + localName + ">";
+  const std::string value = Tests::Between(Good(), open, close);
+  return Tests::ReplacedBetween(Good(), open, close, "<![CDATA[" + value + "]]>");
+}
+
 const SyntaxCase kCases[] = {
     {"CommentInDigestValue", [] { return Inside("DigestValue", "<!---->"); },
      "Element 'ds:DigestValue' may hold nothing but text."},
@@ -76,6 +84,16 @@ const SyntaxCase kCases[] = {
      "Element 'ds:DigestValue' may hold nothing but text."},
     {"ElementInSignatureValue", [] { return Inside("SignatureValue", "<x/>"); },
      "Element 'ds:SignatureValue' may hold nothing but text."},
+    {"CDataInDigestValue", [] { return InCData("DigestValue"); },
+     "Element 'ds:DigestValue' may not hold a CDATA section."},
+    {"CDataInSignatureValue", [] { return InCData("SignatureValue"); },
+     "Element 'ds:SignatureValue' may not hold a CDATA section."},
+    {"CDataInCertificate", [] { return InCData("X509Certificate"); },
+     "Element 'ds:X509Certificate' may not hold a CDATA section."},
+    {"EmptyCDataInDigestValue", [] { return Inside("DigestValue", "<![CDATA[]]>"); },
+     "Element 'ds:DigestValue' may not hold a CDATA section."},
+    {"EmptyCDataInSignatureValue", [] { return Inside("SignatureValue", "<![CDATA[]]>"); },
+     "Element 'ds:SignatureValue' may not hold a CDATA section."},
     {"InstructionBetweenElements", [] { return InsertedBefore("<ds:SignatureValue>", "<?x y?>"); },
      "Element 'ds:Signature' holds a processing instruction."},
     {"TextBetweenElements", [] { return InsertedBefore("<ds:SignatureValue>", "x"); },
@@ -163,6 +181,12 @@ TEST(SignatureReader, AcceptsWhiteSpaceInValuesAndBetweenElements) {
   EXPECT_EQ(Judge(Inside("X509Certificate", "\r\n ")), "valid");
   EXPECT_EQ(Judge(InsertedBefore("<ds:SignatureValue>", "\n  ")), "valid");
   EXPECT_EQ(Judge(InsertedBefore("<ds:SignatureValue>", "<!-- value follows -->")), "valid");
+}
+
+// The values are what they were: only the way that they are written is refused above.
+TEST(SignatureReader, AcceptsCDataSectionsWithoutAValue) {
+  EXPECT_EQ(Judge(InsertedBefore("<ds:SignatureValue>", "<![CDATA[ ]]>")), "valid");
+  EXPECT_EQ(Judge(InsertedBefore("<ds:SignatureValue>", "<![CDATA[]]>")), "valid");
 }
 
 // White space in SignedInfo is signed: it may stand there, but not be put there.
