@@ -23,7 +23,7 @@ void InitLibraries() {
 }
 
 bool VerifyDocument(xmlDocPtr document, xmlSecKeyPtr key) {
-  const xmlChar* ids[] = {BAD_CAST "ID", nullptr};
+  const xmlChar* ids[] = {reinterpret_cast<const xmlChar*>("ID"), nullptr};
   xmlNodePtr root = xmlDocGetRootElement(document);
   xmlSecAddIDs(document, root, ids);
   xmlNodePtr signature = xmlSecFindNode(root, xmlSecNodeSignature, xmlSecDSigNs);
