@@ -61,7 +61,8 @@ TEST_F(AcquireTokenTest, SpecReachesTheToken) {
   spec.renewable = true;
   spec.delegable = true;
   spec.audienceRestriction = {"https://b.example", "https://a.example"};
-  spec.advice = {{"urn:source", {{"urn:attribute", {"one", "two"}}, {"urn:empty", {}}}}};
+  spec.advice = {{"urn:source", {{"urn:attribute", {"one", "", "two"}}, {"urn:empty", {}}}},
+                 {"", {}}};
   const auto token = Acquire(spec);
   EXPECT_TRUE(token->IsRenewable());
   EXPECT_TRUE(token->IsDelegable());
@@ -70,11 +71,15 @@ TEST_F(AcquireTokenTest, SpecReachesTheToken) {
   EXPECT_THAT(audiences, ElementsAre("https://a.example", "https://b.example"));
   std::vector<Advice> advice;
   token->GetAdvice(advice);
-  ASSERT_EQ(advice.size(), 1U);
+  ASSERT_EQ(advice.size(), 2U);
   EXPECT_EQ(advice[0].source, "urn:source");
-  ASSERT_GE(advice[0].attributes.size(), 1U);
+  ASSERT_EQ(advice[0].attributes.size(), 2U);
   EXPECT_EQ(advice[0].attributes[0].name, "urn:attribute");
-  EXPECT_THAT(advice[0].attributes[0].values, ElementsAre("one", "two"));
+  EXPECT_THAT(advice[0].attributes[0].values, ElementsAre("one", "", "two"));
+  EXPECT_EQ(advice[0].attributes[1].name, "urn:empty");
+  EXPECT_THAT(advice[0].attributes[1].values, ElementsAre());
+  EXPECT_EQ(advice[1].source, "");
+  EXPECT_THAT(advice[1].attributes, ElementsAre());
 }
 
 TEST_F(AcquireTokenTest, DelegationIsReadBackAsAChain) {
