@@ -3,6 +3,7 @@
 #include <thread>
 
 #include <tarnik/core/object_impl.h>
+#include <tarnik/xml/security/xml_security_exception.h>
 #include <tarnik/xml/xml_parse_exception.h>
 
 #include "support/assertion_text.h"
@@ -225,6 +226,13 @@ TEST(CreateSamlToken, PassesThePlatformsFaultOfATextThatIsNotXml) {
   for (const char* xml : {"", "not XML", "<a>", "<a/><b/>", "<saml2:Assertion/>"}) {
     EXPECT_THROW(CreateSamlToken(xml), XMLParseException) << xml;
   }
+}
+
+TEST(CreateSamlTokenFromDom, PassesThePlatformsFaultOfAnElementWithoutCanonicalForm) {
+  const auto document = ParseXml("<w xmlns:r=\"relative\">" + AssertionText().ToXml() + "</w>");
+  EXPECT_THROW(
+      CreateSamlTokenFromDom(TestSupport::FindElement(document->RootElement(), "Assertion")),
+      Tarnik::Xml::Security::XmlSecurityException);
 }
 
 TEST(CreateSamlTokenFromDom, RefusesNullAndOtherElements) {
