@@ -12,7 +12,8 @@
 namespace SsoClient {
 
 /// Reads the signature at the cursor and checks its form and that one of its references names the
-/// assertion with this ID or the whole document. Verifies nothing. Throws `ParseException`.
+/// assertion with this ID or the whole document, and that its KeyInfo, which is not signed, holds
+/// no SAML element. Verifies nothing. Throws `ParseException`.
 Tarnik::Ref<Tarnik::Xml::Security::Signature> ReadSignature(ChildCursor& cursor,
                                                             std::string_view assertionId);
 

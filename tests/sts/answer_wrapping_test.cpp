@@ -1,0 +1,115 @@
+#include "sts/response_handler_impl.h"
+
+#include <ssoclient/saml_token.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/reader.h>
+
+#include "sts/answers.h"
+#include "support/assertion_text.h"
+#include "support/forgeries.h"
+
+// Forged assertions in the answers of a service: whatever part of an answer the client reads, it
+// never takes a forged one for a token.
+namespace SsoClient {
+namespace {
+
+using Testing::Collection;
+using Testing::Envelope;
+using Testing::Requested;
+using Testing::Rstr;
+using TestSupport::Arranged;
+using TestSupport::ForgedAssertion;
+using TestSupport::ForgedId;
+using TestSupport::ForgedSignature;
+using TestSupport::OriginalAssertion;
+using TestSupport::Place;
+using TestSupport::Replaced;
+
+std::string Issued(const std::string& content) {
+  return Envelope(Collection(Rstr(Requested(content))));
+}
+
+std::string WithHeader(const std::string& answer, const std::string& header) {
+  return Replaced(answer, "<S:Header/>", "<S:Header>" + header + "</S:Header>");
+}
+
+std::vector<std::string> InOneAnswer(const std::string& first, const std::string& second) {
+  const std::string token = Requested(first);
+  return {
+      Issued(first + second),
+      Issued("<x>" + first + "</x>" + second),
+      Envelope(Collection(Rstr(token + Requested(second)))),
+      Envelope(Collection(Rstr(token) + Rstr(Requested(second)))),
+      Envelope(Collection(Rstr(token)) + Collection(Rstr(Requested(second)))),
+      Envelope(Collection(Rstr("<RequestedSecurityToken xmlns=\"urn:x\">" + first +
+                               "</RequestedSecurityToken>" + Requested(second)))),
+      Replaced(Issued(second), "<S:Body ",
+               "<S:Body xmlns:wst=\"urn:x\">" + Collection(Rstr(token)) + "</S:Body><S:Body "),
+      WithHeader(Issued(second), first),
+      WithHeader(Issued(second),
+                 "<S:Body xmlns:wst=\"urn:x\">" + Collection(Rstr(token)) + "</S:Body>"),
+  };
+}
+
+std::vector<std::string> Answers(const std::string& forged, const std::string& original) {
+  std::vector<std::string> answers = InOneAnswer(forged, original);
+  for (std::string& answer : InOneAnswer(original, forged)) {
+    answers.push_back(std::move(answer));
+  }
+  for (const Place place : TestSupport::AllPlaces()) {
+    const std::string arranged = Arranged(place, forged, original);
+    if (!arranged.empty()) {
+      answers.push_back(Issued(arranged));
+    }
+  }
+  return answers;
+}
+
+// "" if refused, else the name of the accepted subject.
+std::string AcceptedSubject(const std::string& answer,
+                            const Tarnik::Xml::Security::KeyInfoResolver* resolver) {
+  const auto reader = Tarnik::CreateStringReader(answer);
+  try {
+    std::string assertion;
+    ResponseHandlerImpl().ParseIssueResponse(reader.get(), assertion);
+    return CreateSamlToken(assertion, resolver)->Subject().name;
+  } catch (const Tarnik::Exception&) {
+    return "";
+  }
+}
+
+class AnswerWrapping : public testing::TestWithParam<std::tuple<ForgedId, ForgedSignature>> {};
+
+TEST_P(AnswerWrapping, NeverYieldsTheForgedAssertion) {
+  const auto& [id, signature] = GetParam();
+  const std::string original = OriginalAssertion();
+  const std::string forged = ForgedAssertion(id, signature, original);
+  const auto resolver = TestSupport::TrustedResolver();
+  EXPECT_EQ(AcceptedSubject(Issued(forged), resolver.get()), "");
+  for (const std::string& answer : Answers(forged, original)) {
+    const std::string accepted = AcceptedSubject(answer, resolver.get());
+    EXPECT_TRUE(accepted.empty() || accepted == "alice") << accepted << " of " << answer;
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Arrangements, AnswerWrapping,
+                         testing::Combine(testing::ValuesIn(TestSupport::AllForgedIds()),
+                                          testing::ValuesIn(TestSupport::AllForgedSignatures())));
+
+// The same answers hand the forged assertion out when nothing is verified, so it is the signature
+// that the tests above see refused.
+TEST(AnswerWrappingTwin, ReadsForgeriesWhenNothingIsVerified) {
+  const std::string original = OriginalAssertion();
+  const std::string forged = ForgedAssertion(ForgedId::kNew, ForgedSignature::kStranger, original);
+  EXPECT_EQ(AcceptedSubject(Issued(original), TestSupport::TrustedResolver().get()), "alice");
+  EXPECT_EQ(AcceptedSubject(Issued(original), nullptr), "alice");
+  EXPECT_EQ(AcceptedSubject(Issued(forged), nullptr), "admin");
+  std::size_t forgedOnes = 0;
+  for (const std::string& answer : Answers(forged, original)) {
+    forgedOnes += AcceptedSubject(answer, nullptr) == "admin" ? 1 : 0;
+  }
+  EXPECT_GE(forgedOnes, 5U);
+}
+
+}  // namespace
+}  // namespace SsoClient
