@@ -15,11 +15,17 @@ void StartSslHandshake(const std::string& host, Tarnik::Ssl::SSLContext* sslCont
     completion(stream, error);
     return;
   }
-  const auto sslStream = sslContext->WrapStream(stream, "");
-  sslStream->HandshakeClientAsync(host, serverName,
-                                  [completion, sslStream](Tarnik::Exception* handshakeError) {
-                                    completion(sslStream.get(), handshakeError);
-                                  });
+  Tarnik::Ref<Tarnik::Ssl::SSLStream> sslStream;
+  try {
+    sslStream = sslContext->WrapStream(stream, "");
+    sslStream->HandshakeClientAsync(host, serverName,
+                                    [completion, sslStream](Tarnik::Exception* handshakeError) {
+                                      completion(sslStream.get(), handshakeError);
+                                    });
+  } catch (Tarnik::Exception& refusal) {
+    // A server name that is none, for instance. Left to go on, it would end the I/O thread.
+    completion(sslStream != nullptr ? sslStream.get() : stream, &refusal);
+  }
 }
 
 }  // namespace

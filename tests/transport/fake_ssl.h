@@ -6,6 +6,7 @@
 #include <string>
 #include <utility>
 
+#include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/ssl/ssl_context.h>
@@ -37,7 +38,8 @@ class FakeSslStream final : public Tarnik::Ssl::SSLStream, public Tarnik::Object
   Tarnik::Ref<Tarnik::System::Stream> below_;
 };
 
-/// Records what its streams are asked for; handshakes fail with `handshakeFailure` if it is set.
+/// Records what its streams are asked for. Handshakes fail with `handshakeFailure` if it is set,
+/// and do not even begin, with `handshakeRefusal`, if that is.
 class FakeSslContext final : public Tarnik::Ssl::SSLContext, public Tarnik::ObjectImpl {
  public:
   Tarnik::Ref<Tarnik::Ssl::SSLStream> WrapStream(Tarnik::System::Stream* stream,
@@ -52,6 +54,7 @@ class FakeSslContext final : public Tarnik::Ssl::SSLContext, public Tarnik::Obje
   std::string host;
   std::string serverName;
   std::optional<std::string> handshakeFailure;
+  std::optional<std::string> handshakeRefusal;
 };
 
 inline void FakeSslStream::HandshakeClientAsync(const std::string& host,
@@ -59,6 +62,9 @@ inline void FakeSslStream::HandshakeClientAsync(const std::string& host,
                                                 HandshakeCompletion completion) {
   context_->host = host;
   context_->serverName = serverName;
+  if (context_->handshakeRefusal) {
+    throw Tarnik::InvalidArgumentException(*context_->handshakeRefusal);
+  }
   Tarnik::System::GetThreadPool()->Post(
       [failure = context_->handshakeFailure, completion = std::move(completion)] {
         if (!failure) {

@@ -82,6 +82,20 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, AFailedHandshakeComesWithItsStream) {
   recorder.lastStream->Close();
 }
 
+TEST_F(SsoCustomSslConnectionSpecImplTest, AHandshakeThatCannotBeginIsReportedOnce) {
+  Testing::LoopbackSocket listener;
+  ASSERT_EQ(::listen(listener.Descriptor(), 1), 0);
+  context_->handshakeRefusal = "the server name is none";
+  Testing::ConnectRecorder recorder;
+  MakeSpec("127.0.0.1", listener.Port())->StartConnect(recorder.Completion());
+  recorder.Wait();
+  EXPECT_EQ(recorder.calls, 1);
+  EXPECT_TRUE(recorder.hasError);
+  EXPECT_EQ(recorder.message, "the server name is none");
+  ASSERT_NE(recorder.lastStream, nullptr);
+  recorder.lastStream->Close();
+}
+
 TEST_F(SsoCustomSslConnectionSpecImplTest, AFailedConnectNeverStartsAHandshake) {
   const Testing::LoopbackSocket deaf;  // bound, but nobody listens: refused
   Testing::ConnectRecorder recorder;
