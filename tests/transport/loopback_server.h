@@ -43,6 +43,35 @@ class LoopbackSocket {
   int port_ = 0;
 };
 
+/// A listener whose queue is full: a further connect neither succeeds nor fails.
+class FullListener {
+ public:
+  FullListener() {
+    ::listen(listener_.Descriptor(), 0);
+    for (int i = 0; i < 4; ++i) {
+      fillers_.push_back(::socket(AF_INET, SOCK_STREAM | SOCK_NONBLOCK, 0));
+      sockaddr_in address = {};
+      address.sin_family = AF_INET;
+      address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+      address.sin_port = htons(static_cast<in_port_t>(listener_.Port()));
+      ::connect(fillers_.back(), static_cast<sockaddr*>(static_cast<void*>(&address)),
+                sizeof(address));
+    }
+  }
+  FullListener(const FullListener&) = delete;
+  FullListener& operator=(const FullListener&) = delete;
+  ~FullListener() {
+    for (const int fd : fillers_) {
+      ::close(fd);
+    }
+  }
+  int Port() const { return listener_.Port(); }
+
+ private:
+  LoopbackSocket listener_;
+  std::vector<int> fillers_;
+};
+
 /// A plain HTTP server on the loopback address that answers each whole request with what `answer`
 /// makes of it, byte for byte.
 class LoopbackServer {

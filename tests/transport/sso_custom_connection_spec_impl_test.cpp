@@ -1,10 +1,8 @@
 #include "transport/sso_custom_connection_spec_impl.h"
 
-#include <fcntl.h>
 #include <gmock/gmock.h>
 
 #include <sstream>
-#include <vector>
 
 #include "transport/connect_recorder.h"
 #include "transport/loopback_server.h"
@@ -73,37 +71,8 @@ TEST(SsoCustomConnectionSpecImplTest, ReportsAFailedConnectOnce) {
   EXPECT_THAT(recorder.message, testing::HasSubstr(std::to_string(deaf.Port())));
 }
 
-// A listener whose queue is full: a further connect neither succeeds nor fails.
-class FullListener {
- public:
-  FullListener() {
-    ::listen(listener_.Descriptor(), 0);
-    for (int i = 0; i < 4; ++i) {
-      fillers_.push_back(::socket(AF_INET, SOCK_STREAM | SOCK_NONBLOCK, 0));
-      sockaddr_in address = {};
-      address.sin_family = AF_INET;
-      address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-      address.sin_port = htons(static_cast<in_port_t>(listener_.Port()));
-      ::connect(fillers_.back(), static_cast<sockaddr*>(static_cast<void*>(&address)),
-                sizeof(address));
-    }
-  }
-  FullListener(const FullListener&) = delete;
-  FullListener& operator=(const FullListener&) = delete;
-  ~FullListener() {
-    for (const int fd : fillers_) {
-      ::close(fd);
-    }
-  }
-  int Port() const { return listener_.Port(); }
-
- private:
-  Testing::LoopbackSocket listener_;
-  std::vector<int> fillers_;
-};
-
 TEST(SsoCustomConnectionSpecImplTest, CancellingClosesTheSocket) {
-  const FullListener listener;
+  const Testing::FullListener listener;
   Testing::ConnectRecorder recorder;
   const auto item = MakeSpec("127.0.0.1", listener.Port())->StartConnect(recorder.Completion());
   EXPECT_TRUE(item->Cancel());
