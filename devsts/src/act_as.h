@@ -9,7 +9,7 @@
 
 namespace DevSts {
 
-// Makes `content` speak of the subject of a presented token (WS-Trust 1.4, section 4.2.1), with
+// Makes `content` speak of the subject of a presented token (WS-Trust 1.4, section 9.3), with
 // `requester` at the end of its delegation chain. The token must be ours, current, and delegable or
 // already delegated to the requester. Throws Fault.
 void ActAs(xmlNode* assertion, const std::string& requester, const std::string& signingPem,

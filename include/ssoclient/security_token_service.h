@@ -39,7 +39,8 @@ class SecurityTokenService {
                                                         const TokenSpec& spec) const = 0;
 
   /// As above, but returns at once and reports to `callback`. Arguments are copied; the service may
-  /// be released before the call has ended.
+  /// be released before the call has ended. Throws `Tarnik::InvalidArgumentException` when
+  /// `callback` is empty; every failure of the operation itself goes to the callback.
   virtual void AcquireTokenAsync(const std::string& userName, const std::string& password,
                                  const TokenSpec& spec, TokenCallback callback) const = 0;
 
@@ -47,10 +48,14 @@ class SecurityTokenService {
   ~SecurityTokenService() = default;
 };
 
-/// Throws `Tarnik::InvalidArgumentException` for a malformed URL, and for an https URL without an
-/// SSL context.
+/// A service that connects by itself, with a connection and cookies of its own for each operation.
+/// Throws `Tarnik::InvalidArgumentException` for a malformed URL, for an https URL without an SSL
+/// context, and when the token factory is null.
 SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfig& config);
+/// A service that sends through the caller's user agent. Throws `Tarnik::InvalidArgumentException`
+/// when the user agent or the token factory is null. A request target that cannot be sent is
+/// refused by the operations.
 SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfigEx& config);
 

@@ -20,7 +20,7 @@ struct SecurityTokenServiceConfig {
   /// The source of the keys that verify tokens outside of `tokenFactory`. A service does not read
   /// it: what it verifies, it verifies through `tokenFactory`.
   const Tarnik::Xml::Security::KeyInfoResolver* keyInfoResolver = nullptr;
-  /// Turns answered assertions into verified tokens.
+  /// Turns answered assertions into verified tokens; must not be null.
   std::shared_ptr<SamlTokenFactory> tokenFactory;
   /// The name that the service's TLS certificate must carry; the URL's host if empty.
   std::string sslPeerName;
@@ -35,9 +35,9 @@ struct SecurityTokenServiceConfig {
 struct SecurityTokenServiceConfigEx {
   /// The request target of every POST, used as it stands.
   std::string url;
-  /// Shared by all exchanges of the service; knows where and how to connect.
+  /// Shared by all exchanges of the service; knows where and how to connect. Must not be null.
   Tarnik::Ref<Tarnik::Http::UserAgent> userAgent;
-  /// Turns answered assertions into verified tokens.
+  /// Turns answered assertions into verified tokens; must not be null.
   std::shared_ptr<SamlTokenFactory> tokenFactory;
 };
 

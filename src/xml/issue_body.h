@@ -10,7 +10,7 @@
 namespace SsoClient {
 
 /// wst:RequestSecurityToken that asks for a token (WS-Trust 1.3, section 4.1; ActAs as in WS-Trust
-/// 1.4, section 4.1.3). `keyType` 0 asks for a bearer token, anything else for a holder-of-key one.
+/// 1.4, section 9.3). `keyType` 0 asks for a bearer token, anything else for a holder-of-key one.
 ///
 /// Throws `Tarnik::InvalidArgumentException` when the spec's act-as token is set but null, and
 /// `Tarnik::Xml::XMLParseException` when that token's text is malformed.

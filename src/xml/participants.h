@@ -9,7 +9,7 @@
 
 namespace SsoClient {
 
-/// wst:Participants (WS-Trust 1.3, section 9.4) with one participant for each audience, in order.
+/// wst:Participants (WS-Trust 1.3, section 9.5) with one participant for each audience, in order.
 std::shared_ptr<XMLCompositeBuilder> BuildParticipants(
     const std::set<std::string>& audienceRestriction);
 
