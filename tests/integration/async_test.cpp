@@ -53,13 +53,14 @@ TEST_F(AsyncTest, FailureReachesTheCallbackWithItsExactClass) {
 }
 
 TEST_F(AsyncTest, ArgumentErrorsReachTheCallbackToo) {
-  std::promise<std::string> promise;
+  // Shared, here and below: the callback may still be leaving when the result is here.
+  const auto promise = std::make_shared<std::promise<std::string>>();
   Service()->AcquireTokenAsync(
       kUser, kPassword, TokenSpec{},
-      [&](const std::shared_ptr<const SamlToken>&, const Tarnik::Exception* error) {
-        promise.set_value(error == nullptr ? "" : error->Message());
+      [promise](const std::shared_ptr<const SamlToken>&, const Tarnik::Exception* error) {
+        promise->set_value(error == nullptr ? "" : error->Message());
       });
-  EXPECT_EQ(promise.get_future().get(), "Token lifetime must be positive");
+  EXPECT_EQ(promise->get_future().get(), "Token lifetime must be positive");
 }
 
 TEST_F(AsyncTest, ServiceMayBeReleasedBeforeTheCallEnds) {
@@ -74,19 +75,19 @@ TEST_F(AsyncTest, ServiceMayBeReleasedBeforeTheCallEnds) {
 
 TEST_F(AsyncTest, CallbackMayStartTheNextCall) {
   const auto service = Service();
-  std::promise<int> promise;
+  const auto promise = std::make_shared<std::promise<int>>();
   std::function<void(int)> next = [&](int left) {
     service->AcquireTokenAsync(kUser, kPassword, TenMinutes(),
-                               [&, left](const auto& token, const Tarnik::Exception*) {
+                               [&, promise, left](const auto& token, const Tarnik::Exception*) {
                                  if (token == nullptr || left == 0) {
-                                   promise.set_value(left);
+                                   promise->set_value(left);
                                    return;
                                  }
                                  next(left - 1);
                                });
   };
   next(5);
-  EXPECT_EQ(promise.get_future().get(), 0);
+  EXPECT_EQ(promise->get_future().get(), 0);
 }
 
 TEST_F(AsyncTest, CallbackMayBlockOnASynchronousCall) {
