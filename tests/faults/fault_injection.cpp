@@ -1,0 +1,117 @@
+#include "faults/fault_injection.h"
+
+#include <expat.h>
+#include <openssl/evp.h>
+
+#include <cstdlib>
+#include <new>
+
+extern "C" void* __real_malloc(std::size_t size);
+
+namespace FaultInjection {
+namespace {
+
+struct Plan {
+  bool isArmed = false;
+  Kind kind = Kind::kAllocation;
+  std::size_t callsToGo = 0;
+  int result = 0;
+  bool hasHappened = false;
+};
+
+Plan plan;
+
+bool Fails(Kind kind) noexcept {
+  if (!plan.isArmed || plan.kind != kind || plan.hasHappened) {
+    return false;
+  }
+  plan.hasHappened = plan.callsToGo == 0;
+  --plan.callsToGo;
+  return plan.hasHappened;
+}
+
+void* Allocate(std::size_t size) noexcept {
+  return Fails(Kind::kAllocation) ? nullptr : __real_malloc(size);
+}
+
+void* Reallocate(void* memory, std::size_t size) noexcept {
+  return Fails(Kind::kAllocation) ? nullptr : std::realloc(memory, size);
+}
+
+}  // namespace
+
+Fault::Fault(Kind kind, std::size_t index, int result) noexcept {
+  plan = {true, kind, index, result, false};
+}
+
+Fault::~Fault() {
+  plan.isArmed = false;
+}
+
+bool Fault::HasHappened() const noexcept {
+  return plan.hasHappened;
+}
+
+}  // namespace FaultInjection
+
+void* operator new(std::size_t size) {
+  void* memory = FaultInjection::Allocate(size);
+  if (memory == nullptr) {
+    throw std::bad_alloc();
+  }
+  return memory;
+}
+
+void operator delete(void* memory) noexcept {
+  std::free(memory);
+}
+
+void operator delete(void* memory, std::size_t) noexcept {
+  std::free(memory);
+}
+
+// The linker sends the calls of the libraries under test here (its option --wrap).
+extern "C" {
+
+void* __wrap_malloc(std::size_t size) {
+  return FaultInjection::Allocate(size);
+}
+
+XML_Parser __wrap_XML_ParserCreate(const XML_Char* encoding) {
+  static const XML_Memory_Handling_Suite kMemory{FaultInjection::Allocate,
+                                                 FaultInjection::Reallocate, std::free};
+  return XML_ParserCreate_MM(encoding, &kMemory, nullptr);
+}
+
+int __real_EVP_DigestInit_ex2(EVP_MD_CTX* context, const EVP_MD* type, const OSSL_PARAM* params);
+int __wrap_EVP_DigestInit_ex2(EVP_MD_CTX* context, const EVP_MD* type, const OSSL_PARAM* params) {
+  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
+             ? FaultInjection::plan.result
+             : __real_EVP_DigestInit_ex2(context, type, params);
+}
+
+int __real_EVP_DigestUpdate(EVP_MD_CTX* context, const void* data, std::size_t size);
+int __wrap_EVP_DigestUpdate(EVP_MD_CTX* context, const void* data, std::size_t size) {
+  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
+             ? FaultInjection::plan.result
+             : __real_EVP_DigestUpdate(context, data, size);
+}
+
+int __real_EVP_DigestFinal_ex(EVP_MD_CTX* context, unsigned char* digest, unsigned* size);
+int __wrap_EVP_DigestFinal_ex(EVP_MD_CTX* context, unsigned char* digest, unsigned* size) {
+  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
+             ? FaultInjection::plan.result
+             : __real_EVP_DigestFinal_ex(context, digest, size);
+}
+
+int __real_EVP_PKEY_verify(EVP_PKEY_CTX* context, const unsigned char* signature,
+                           std::size_t signatureSize, const unsigned char* digest,
+                           std::size_t digestSize);
+int __wrap_EVP_PKEY_verify(EVP_PKEY_CTX* context, const unsigned char* signature,
+                           std::size_t signatureSize, const unsigned char* digest,
+                           std::size_t digestSize) {
+  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
+             ? FaultInjection::plan.result
+             : __real_EVP_PKEY_verify(context, signature, signatureSize, digest, digestSize);
+}
+}

@@ -1,0 +1,116 @@
+#include <ssoclient/saml_token.h>
+
+#include <gtest/gtest.h>
+
+#include <new>
+
+#include "faults/fault_injection.h"
+#include "support/assertion_text.h"
+#include "support/forgeries.h"
+
+// One call fails in the midst of reading and verifying a token: a forged one is never accepted, a
+// good one never for the wrong reason, and nothing leaks.
+namespace SsoClient {
+namespace {
+
+using FaultInjection::Fault;
+using FaultInjection::Kind;
+using Tarnik::Xml::Security::KeyInfoResolver;
+
+enum class Verdict { kAccepted, kRefused, kOutOfMemory };
+
+Verdict Judge(const std::string& xml, const KeyInfoResolver* resolver) {
+  try {
+    CreateSamlToken(xml, resolver);
+    return Verdict::kAccepted;
+  } catch (const std::bad_alloc&) {
+    return Verdict::kOutOfMemory;
+  } catch (const Tarnik::Exception&) {
+    return Verdict::kRefused;
+  }
+}
+
+struct Forgery {
+  const char* name;
+  std::string xml;
+};
+
+std::vector<Forgery> Forgeries() {
+  const std::string original = TestSupport::OriginalAssertion();
+  using TestSupport::ForgedId;
+  using TestSupport::ForgedSignature;
+  return {{"Tampered", TestSupport::Replaced(original, "alice@", "admin@")},
+          {"Stranger",
+           TestSupport::ForgedAssertion(ForgedId::kSame, ForgedSignature::kStranger, original)},
+          {"MadeUp",
+           TestSupport::ForgedAssertion(ForgedId::kSame, ForgedSignature::kMadeUp, original)}};
+}
+
+class TokenFaults : public testing::Test {
+ protected:
+  // What is set up once in the process is not under test.
+  void SetUp() override { ASSERT_EQ(Judge(original_, resolver_.get()), Verdict::kAccepted); }
+
+  const std::string original_ = TestSupport::OriginalAssertion();
+  const Tarnik::Ref<const KeyInfoResolver> resolver_ = TestSupport::TrustedResolver();
+};
+
+TEST_F(TokenFaults, GoodTokenIsReadOrMemoryIsOut) {
+  std::size_t failures = 0;
+  for (bool happened = true; happened;) {
+    Verdict verdict;
+    {
+      const Fault fault(Kind::kAllocation, failures);
+      verdict = Judge(original_, resolver_.get());
+      happened = fault.HasHappened();
+    }
+    ASSERT_EQ(verdict, happened ? Verdict::kOutOfMemory : Verdict::kAccepted) << failures;
+    ++failures;
+  }
+  EXPECT_GT(failures, 50U);
+}
+
+TEST_F(TokenFaults, ForgedTokenIsNeverAcceptedWhenMemoryIsOut) {
+  for (const Forgery& forgery : Forgeries()) {
+    std::size_t failures = 0;
+    for (bool happened = true; happened; ++failures) {
+      const Fault fault(Kind::kAllocation, failures);
+      const Verdict verdict = Judge(forgery.xml, resolver_.get());
+      happened = fault.HasHappened();
+      ASSERT_EQ(verdict, happened ? Verdict::kOutOfMemory : Verdict::kRefused)
+          << forgery.name << " " << failures;
+    }
+    EXPECT_GT(failures, 50U);
+  }
+}
+
+class CryptoFaults : public TokenFaults, public testing::WithParamInterface<int> {};
+
+TEST_P(CryptoFaults, AreNeverTakenForAGoodSignature) {
+  std::size_t calls = 0;
+  for (bool happened = true; happened; ++calls) {
+    const Fault fault(Kind::kCrypto, calls, GetParam());
+    const Verdict verdict = Judge(original_, resolver_.get());
+    happened = fault.HasHappened();
+    ASSERT_EQ(verdict, happened ? Verdict::kRefused : Verdict::kAccepted) << calls;
+  }
+  // Two digests of three calls or more, and one verification.
+  EXPECT_GE(calls, 8U);
+}
+
+TEST_P(CryptoFaults, DoNotHelpAForgery) {
+  for (const Forgery& forgery : Forgeries()) {
+    std::size_t calls = 0;
+    for (bool happened = true; happened; ++calls) {
+      const Fault fault(Kind::kCrypto, calls, GetParam());
+      ASSERT_EQ(Judge(forgery.xml, resolver_.get()), Verdict::kRefused)
+          << forgery.name << " " << calls;
+      happened = fault.HasHappened();
+    }
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Results, CryptoFaults, testing::Values(0, -1));
+
+}  // namespace
+}  // namespace SsoClient
