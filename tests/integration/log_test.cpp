@@ -93,5 +93,55 @@ TEST_F(LogTest, NoPasswordOrTokenTextInAnyLine) {
   }
 }
 
+void Replace(std::string& text, const std::string& what, const std::string& with) {
+  const auto at = text.find(what);
+  ASSERT_NE(at, std::string::npos) << what;
+  text.replace(at, what.size(), with);
+}
+
+std::string Between(const std::string& text, const std::string& start, const std::string& end) {
+  const auto from = text.find(start) + start.size();
+  return text.substr(from, text.find(end, from) - from);
+}
+
+TEST_F(LogTest, NoTokenTextInTheFailureOrTheLinesOfARefusedAnswer) {
+  using Edit = void (*)(std::string&);
+  const Edit kEdits[] = {
+      [](std::string& envelope) { envelope.resize(envelope.size() / 2); },
+      [](std::string& envelope) { Replace(envelope, "</saml2:Conditions>", "</saml2:Broken>"); },
+      [](std::string& envelope) { Replace(envelope, ":Conditions", "&:Conditions"); },
+      [](std::string& envelope) { Replace(envelope, "<saml2:Conditions", "<saml2:Other"); },
+      [](std::string& envelope) { Replace(envelope, "alice@", "malice@"); },
+      [](std::string& envelope) { Replace(envelope, "RequestedSecurityToken>", "Nothing>"); },
+      [](std::string& envelope) { Replace(envelope, "SignatureValue>", "SignatureValue><a/>"); },
+  };
+  Tarnik::Service::SetLogLevel("SsoClient", 9);
+  for (const Edit edit : kEdits) {
+    std::string signature;
+    DevSts::Misbehavior misbehavior;
+    misbehavior.editEnvelope = [&signature, edit](std::string& envelope) {
+      signature = Between(envelope, "SignatureValue>", "<");
+      edit(envelope);
+    };
+    Sts().SetMisbehavior(misbehavior);
+    std::string message;
+    try {
+      Acquire();
+      ADD_FAILURE() << "the answer was accepted";
+    } catch (const Tarnik::Exception& error) {
+      message = error.Message();
+    }
+    Sts().ClearMisbehavior();
+    ASSERT_GT(signature.size(), 40U);
+    lines_.push_back({0, message});
+    for (const Line& line : lines_) {
+      EXPECT_THAT(line.text, Not(HasSubstr(signature.substr(0, 20))));
+      EXPECT_THAT(line.text, Not(HasSubstr("secret")));
+      EXPECT_THAT(line.text, Not(HasSubstr("<saml2")));
+    }
+    lines_.clear();
+  }
+}
+
 }  // namespace
 }  // namespace SsoClient::Tests
