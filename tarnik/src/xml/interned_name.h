@@ -9,9 +9,9 @@ namespace Tarnik::Xml {
 /// repeat, so nodes and attributes share them.
 struct InternedName {
   unsigned length;
-  unsigned prefixLength;
+  unsigned prefixLength : 31;
   /// True for "xmlns" and "xmlns:p", as attribute names.
-  bool isDeclaration;
+  bool isDeclaration : 1;
 
   std::string_view Full() const noexcept {
     return {reinterpret_cast<const char*>(this + 1), length};

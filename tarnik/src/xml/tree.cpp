@@ -12,8 +12,11 @@ namespace Tarnik::Xml {
 
 namespace {
 
-constexpr std::size_t kMinBlockBytes = 4096;
-constexpr std::size_t kMaxBlockBytes = 65536;
+// Blocks are a small part of the tree that they belong to: what is left free in the last one is the
+// memory that a living tree wastes.
+constexpr std::size_t kMinBlockBytes = 512;
+constexpr std::size_t kMaxBlockBytes = 16384;
+constexpr std::size_t kBlocksPerTree = 32;
 
 }  // namespace
 
@@ -72,7 +75,7 @@ const InternedName* Tree::StoreName(std::string_view name) {
   const std::size_t bytes = sizeof(InternedName) + name.size();
   auto* stored = static_cast<InternedName*>(Current().AllocateBytes(bytes, alignof(InternedName)));
   stored->length = static_cast<unsigned>(name.size());
-  stored->prefixLength = prefixed ? static_cast<unsigned>(colon) : 0;
+  stored->prefixLength = prefixed ? static_cast<unsigned>(colon) & 0x7FFFFFFFU : 0;
   stored->isDeclaration = prefixed ? name.substr(0, colon) == "xmlns" : name == "xmlns";
   std::memcpy(static_cast<void*>(stored + 1), name.data(), name.size());
   return stored;
@@ -99,7 +102,8 @@ void* Tree::AllocateBytes(std::size_t bytes, std::size_t alignment) {
 }
 
 void* Tree::AllocateFromNewBlock(std::size_t bytes) {
-  const std::size_t usual = std::clamp(totalBytes_ / 8, kMinBlockBytes, kMaxBlockBytes);
+  const std::size_t usual =
+      std::clamp(totalBytes_ / kBlocksPerTree, kMinBlockBytes, kMaxBlockBytes);
   // What is large gets a block of its own, so that the room left in the open one is not lost.
   const bool large = bytes > usual / 4;
   const std::size_t size = large ? sizeof(Block) + bytes : usual;
