@@ -108,7 +108,7 @@ TEST_F(LogTest, NoTokenTextInTheFailureOrTheLinesOfARefusedAnswer) {
   using Edit = void (*)(std::string&);
   const Edit kEdits[] = {
       [](std::string& envelope) { envelope.resize(envelope.size() / 2); },
-      [](std::string& envelope) { Replace(envelope, "</saml2:Conditions>", "</saml2:Broken>"); },
+      [](std::string& envelope) { Replace(envelope, "</saml2:Subject>", "</saml2:Broken>"); },
       [](std::string& envelope) { Replace(envelope, ":Conditions", "&:Conditions"); },
       [](std::string& envelope) { Replace(envelope, "<saml2:Conditions", "<saml2:Other"); },
       [](std::string& envelope) { Replace(envelope, "alice@", "malice@"); },
@@ -116,7 +116,7 @@ TEST_F(LogTest, NoTokenTextInTheFailureOrTheLinesOfARefusedAnswer) {
       [](std::string& envelope) { Replace(envelope, "SignatureValue>", "SignatureValue><a/>"); },
   };
   Tarnik::Service::SetLogLevel("SsoClient", 9);
-  for (const Edit edit : kEdits) {
+  for (const Edit& edit : kEdits) {
     std::string signature;
     DevSts::Misbehavior misbehavior;
     misbehavior.editEnvelope = [&signature, edit](std::string& envelope) {
@@ -127,7 +127,7 @@ TEST_F(LogTest, NoTokenTextInTheFailureOrTheLinesOfARefusedAnswer) {
     std::string message;
     try {
       Acquire();
-      ADD_FAILURE() << "the answer was accepted";
+      ADD_FAILURE() << "the answer was accepted after edit " << (&edit - kEdits);
     } catch (const Tarnik::Exception& error) {
       message = error.Message();
     }
