@@ -16,6 +16,8 @@ endfunction()
 # ssoclient_add_test_runs(TARGET SHARDS): runs a GoogleTest program as SHARDS processes, which CTest may run side by
 # side. A process a test would spend most of its time on starting sanitizers.
 function(ssoclient_add_test_runs target shards)
+  # Sanitizers look into the libraries; optimising the tests as well costs more time than it saves.
+  target_compile_options(${target} PRIVATE $<$<BOOL:${SSOCLIENT_SANITIZER}>:-O0>)
   math(EXPR last "${shards} - 1")
   foreach(index RANGE ${last})
     set(name "${target}.${index}")
