@@ -6,7 +6,6 @@
 #include "floor.h"
 #include "peer.h"
 #include "sample_token.h"
-#include "token_memory.h"
 
 namespace Bench {
 namespace {
@@ -27,8 +26,6 @@ void CheckToken(benchmark::State& state) {
   for (auto _ : state) {
     benchmark::DoNotOptimize(SsoClient::CreateSamlToken(sample.xml, resolver.get()));
   }
-  state.counters["bytes"] = static_cast<double>(sample.xml.size());
-  state.counters["memory"] = TokenMemory(SizeOf(state));
 }
 BENCHMARK(CheckToken)->Apply(ForEachSize);
 

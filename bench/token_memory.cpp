@@ -1,8 +1,9 @@
-#include "token_memory.h"
-
+// Prints for each size of token: the size asked for, the bytes of its text, and the bytes of heap
+// that one living token holds, the allocator's own overhead included.
 #include <malloc.h>
 #include <ssoclient/saml_token.h>
 
+#include <cstdio>
 #include <memory>
 #include <vector>
 
@@ -15,8 +16,6 @@ std::size_t HeapInUse() {
   const struct mallinfo2 info = mallinfo2();
   return info.uordblks + info.hblkhd;
 }
-
-}  // namespace
 
 double TokenMemory(std::size_t size) {
   constexpr std::size_t kTokens = 64;
@@ -32,4 +31,13 @@ double TokenMemory(std::size_t size) {
   return static_cast<double>(HeapInUse() - before) / kTokens;
 }
 
+}  // namespace
 }  // namespace Bench
+
+int main() {
+  for (const std::size_t size : {2000UL, 6000UL, 60000UL, 600000UL}) {
+    const std::size_t bytes = Bench::GetSampleToken(size).xml.size();
+    std::printf("%zu %zu %.0f\n", size, bytes, Bench::TokenMemory(size));
+  }
+  return 0;
+}
