@@ -17,7 +17,9 @@ endfunction()
 # side. A process a test would spend most of its time on starting sanitizers.
 function(ssoclient_add_test_runs target shards)
   # Sanitizers look into the libraries; optimising the tests as well costs more time than it saves.
-  target_compile_options(${target} PRIVATE $<$<BOOL:${SSOCLIENT_SANITIZER}>:-O0>)
+  if(SSOCLIENT_SANITIZER)
+    target_compile_options(${target} PRIVATE -O0)
+  endif()
   math(EXPR last "${shards} - 1")
   foreach(index RANGE ${last})
     set(name "${target}.${index}")
