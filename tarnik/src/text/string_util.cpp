@@ -27,23 +27,26 @@ const unsigned char* AsBytes(const char* text) {
   return reinterpret_cast<const unsigned char*>(text);
 }
 
-std::array<bool, 256> MakeAlphabetTable() {
+constexpr std::array<bool, 256> TableOf(std::string_view characters) {
   std::array<bool, 256> table{};
-  for (const char letter : kAlphabet) {
-    table[static_cast<unsigned char>(letter)] = true;
+  for (const char character : characters) {
+    table[static_cast<unsigned char>(character)] = true;
   }
   return table;
 }
 
-bool IsWhiteSpace(char c) {
-  return c == ' ' || c == '\n' || c == '\r' || c == '\t';
-}
+constexpr std::array<bool, 256> kIsAlphabet = TableOf(kAlphabet);
+constexpr std::array<bool, 256> kIsWhiteSpace = TableOf("\t\n\r ");
 
 std::string WithoutWhiteSpace(std::string_view text) {
-  std::string result;
-  result.reserve(text.size());
-  std::copy_if(text.begin(), text.end(), std::back_inserter(result),
-               [](char c) { return !IsWhiteSpace(c); });
+  std::string result(text.size(), '\0');
+  std::size_t count = 0;
+  // Each character is written, and the next one over it if it is white space: no branch to miss.
+  for (const char character : text) {
+    result[count] = character;
+    count += kIsWhiteSpace[static_cast<unsigned char>(character)] ? 0 : 1;
+  }
+  result.resize(count);
   return result;
 }
 
@@ -66,13 +69,12 @@ bool HasZeroTail(std::string_view symbols, std::size_t padding) {
 }
 
 void CheckBase64(std::string_view text, std::size_t padding) {
-  static const std::array<bool, 256> inAlphabet = MakeAlphabetTable();
   if (text.size() % 4 != 0) {
     throw Base64FormatException("The length of the Base64 text is not a multiple of four.");
   }
   const std::string_view symbols = text.substr(0, text.size() - padding);
   const bool isBase64 = std::all_of(symbols.begin(), symbols.end(), [](char c) {
-    return inAlphabet[static_cast<unsigned char>(c)];
+    return kIsAlphabet[static_cast<unsigned char>(c)];
   });
   if (!isBase64) {
     throw Base64FormatException("The text holds a character that is not Base64.");
