@@ -31,7 +31,11 @@ QName ResolveQName(const Tarnik::Xml::ElementNode& context, std::string_view nam
 }
 
 QNameView ResolveQNameValue(const Tarnik::Xml::ElementNode& context, std::string_view name) {
-  return ResolveQNameView(context, name, context.LookupNamespace("").value_or(""));
+  // The default namespace is asked for by names without a prefix alone: that takes a walk to the
+  // root.
+  const bool isPrefixed = name.find(':') != std::string_view::npos;
+  return ResolveQNameView(context, name,
+                          isPrefixed ? "" : context.LookupNamespace("").value_or(""));
 }
 
 }  // namespace SsoClient
