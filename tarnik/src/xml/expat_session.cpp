@@ -30,10 +30,7 @@ unsigned long HashSalt() noexcept {
 }  // namespace
 
 ExpatSession::ExpatSession(XMLHandler& handler)
-    : handler_(handler), parser_(XML_ParserCreate("UTF-8")) {
-  if (parser_ == nullptr) {
-    throw std::bad_alloc();
-  }
+    : handler_(handler), parser_(CreateParser(memory_)) {
   XML_Parser parser = parser_.get();
   XML_SetHashSalt(parser, HashSalt());
   XML_SetUserData(parser, this);
@@ -46,7 +43,17 @@ ExpatSession::ExpatSession(XMLHandler& handler)
   XML_SetProcessingInstructionHandler(parser, OnProcessingInstruction);
 }
 
+XML_Parser ExpatSession::CreateParser(ExpatMemory& memory) {
+  const ExpatMemory::Scope scope(memory);
+  XML_Parser parser = XML_ParserCreate_MM("UTF-8", &ExpatMemory::Suite(), nullptr);
+  if (parser == nullptr) {
+    throw std::bad_alloc();
+  }
+  return parser;
+}
+
 char* ExpatSession::Buffer(std::size_t size) {
+  const ExpatMemory::Scope scope(memory_);
   auto* buffer = static_cast<char*>(XML_GetBuffer(parser_.get(), static_cast<int>(size)));
   if (buffer == nullptr) {
     throw std::bad_alloc();
@@ -64,6 +71,8 @@ void ExpatSession::ParseBuffer(std::size_t size, bool last) {
     throw XMLParseException(
         "The document is longer than " + std::to_string(kMaxDocumentBytes) + " bytes", located_);
   }
+  lineFeedByte_ = kUnknown;
+  const ExpatMemory::Scope scope(memory_);
   const XML_Status status =
       XML_ParseBuffer(parser_.get(), static_cast<int>(size), last ? XML_TRUE : XML_FALSE);
   if (failure_ != nullptr) {
@@ -92,25 +101,34 @@ void ExpatSession::CheckFirstBytes(const char* bytes, std::size_t size) {
 
 // Expat can tell the place itself, but walks each byte again for it.
 const Position& ExpatSession::Locate() {
+  const long byte = XML_GetCurrentByteIndex(parser_.get());
+  if (byte <= locatedByte_) {
+    return located_;
+  }
+  if (lineFeedByte_ == kUnknown) {
+    lineFeedByte_ = FindLineFeed(locatedByte_, byte);
+  }
+  while (lineFeedByte_ < byte) {
+    ++located_.line;
+    lineStartByte_ = lineFeedByte_ + 1;
+    lineFeedByte_ = FindLineFeed(lineStartByte_, byte);
+  }
+  locatedByte_ = byte;
+  located_.column = static_cast<unsigned long>(byte - lineStartByte_) + 1;
+  return located_;
+}
+
+// The first line feed at `from` or behind it in Expat's buffer; `current` is the byte of the event.
+long ExpatSession::FindLineFeed(long from, long current) const {
   int offset = 0;
   int size = 0;
   const char* buffer = XML_GetInputContext(parser_.get(), &offset, &size);
-  const long byte = XML_GetCurrentByteIndex(parser_.get());
-  const long distance = byte - locatedByte_;
-  if (buffer == nullptr || distance <= 0 || distance > offset) {
-    return located_;
+  if (buffer == nullptr || current - from > offset) {
+    return kNoLineFeed;
   }
-  const char* const end = buffer + offset;
-  const char* lineStart = end - distance;
-  located_.column += static_cast<unsigned long>(distance);
-  while (const void* found =
-             std::memchr(lineStart, '\n', static_cast<std::size_t>(end - lineStart))) {
-    lineStart = static_cast<const char*>(found) + 1;
-    ++located_.line;
-    located_.column = static_cast<unsigned long>(end - lineStart) + 1;
-  }
-  locatedByte_ = byte;
-  return located_;
+  const char* start = buffer + offset - (current - from);
+  const void* found = std::memchr(start, '\n', static_cast<std::size_t>(buffer + size - start));
+  return found == nullptr ? kNoLineFeed : from + (static_cast<const char*>(found) - start);
 }
 
 void ExpatSession::ThrowSyntaxError() {

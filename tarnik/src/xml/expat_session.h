@@ -5,12 +5,15 @@
 
 #include <cstddef>
 #include <exception>
+#include <limits>
 #include <memory>
 #include <string>
 #include <type_traits>
 #include <vector>
 
 #include <tarnik/xml/xml_parser.h>
+
+#include "xml/expat_memory.h"
 
 namespace Tarnik::Xml {
 
@@ -25,6 +28,9 @@ class ExpatSession {
   void ParseBuffer(std::size_t size, bool last);
 
  private:
+  static constexpr long kUnknown = -1;
+  static constexpr long kNoLineFeed = std::numeric_limits<long>::max();
+
   struct Deleter {
     void operator()(XML_Parser parser) const noexcept { XML_ParserFree(parser); }
   };
@@ -47,9 +53,13 @@ class ExpatSession {
   void CheckFirstBytes(const char* bytes, std::size_t size);
   /// The place of the current event.
   const Position& Locate();
+  long FindLineFeed(long from, long current) const;
   void ThrowSyntaxError();
 
+  static XML_Parser CreateParser(ExpatMemory& memory);
+
   XMLHandler& handler_;
+  ExpatMemory memory_;
   std::unique_ptr<std::remove_pointer_t<XML_Parser>, Deleter> parser_;
   const char* buffer_ = nullptr;
   std::size_t totalBytes_ = 0;
@@ -58,6 +68,9 @@ class ExpatSession {
   std::exception_ptr failure_;
   // Where the event before the current one begins.
   long locatedByte_ = 0;
+  long lineStartByte_ = 0;
+  // The next line feed of the chunk, which saves a search for each event.
+  long lineFeedByte_ = kUnknown;
   Position located_{1, 1};
 };
 

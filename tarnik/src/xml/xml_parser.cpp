@@ -11,7 +11,8 @@ namespace Tarnik::Xml {
 
 namespace {
 
-constexpr std::size_t kFirstChunkBytes = std::size_t{16} * 1024;
+// The size of a usual token. Expat adds 1 KiB and rounds up to a power of two.
+constexpr std::size_t kFirstChunkBytes = std::size_t{7} * 1024;
 
 class XMLParserImpl final : public XMLParser, public ObjectImpl {
  public:

@@ -1,0 +1,55 @@
+#ifndef TARNIK_SRC_XML_EXPAT_MEMORY_H
+#define TARNIK_SRC_XML_EXPAT_MEMORY_H
+
+#include <expat.h>
+
+#include <cstddef>
+
+namespace Tarnik::Xml {
+
+/// The memory of one Expat parser. All of it is cleansed before it is given back, since documents
+/// hold passwords and tokens; and the many small pieces that a parser asks for come out of a few
+/// blocks, which live as long as this object.
+///
+/// Expat's functions for memory know nothing of the parser that calls them: a parser may be made
+/// and used only while a `Scope` of its memory is open on the thread.
+class ExpatMemory {
+ public:
+  class Scope {
+   public:
+    explicit Scope(ExpatMemory& memory) noexcept;
+    ~Scope();
+    Scope(const Scope&) = delete;
+    Scope& operator=(const Scope&) = delete;
+
+   private:
+    ExpatMemory* outer_;
+  };
+
+  ExpatMemory() = default;
+  ExpatMemory(const ExpatMemory&) = delete;
+  ExpatMemory& operator=(const ExpatMemory&) = delete;
+  /// To be destroyed after the parser.
+  ~ExpatMemory();
+
+  static const XML_Memory_Handling_Suite& Suite() noexcept;
+
+ private:
+  struct alignas(std::max_align_t) Block {
+    Block* next;
+  };
+
+  static void* Allocate(std::size_t size) noexcept;
+  static void* Reallocate(void* memory, std::size_t size) noexcept;
+  static void Free(void* memory) noexcept;
+
+  void* AllocateSmall(std::size_t size) noexcept;
+
+  Block* blocks_ = nullptr;
+  char* free_ = nullptr;
+  char* freeEnd_ = nullptr;
+};
+
+}  // namespace Tarnik::Xml
+
+#endif
