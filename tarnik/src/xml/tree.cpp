@@ -1,7 +1,5 @@
 #include "xml/tree.h"
 
-#include <openssl/crypto.h>
-
 #include <algorithm>
 #include <cstdint>
 #include <cstdlib>
@@ -90,11 +88,16 @@ Tree::Block* Tree::CreateBlock(std::size_t size) {
 }
 
 void* Tree::AllocateBytes(std::size_t bytes, std::size_t alignment) {
-  const auto address = reinterpret_cast<std::uintptr_t>(free_);
-  const std::size_t padding = (alignment - address % alignment) % alignment;
+  // An alignment is a power of two.
+  const std::size_t padding = -reinterpret_cast<std::uintptr_t>(free_) & (alignment - 1);
   const auto room = static_cast<std::size_t>(freeEnd_ - free_);
   if (room < padding || room - padding < bytes) {
     return AllocateFromNewBlock(bytes);
+  }
+  // Characters fill a block from its end, where they leave no gaps between the nodes.
+  if (alignment == 1) {
+    freeEnd_ -= bytes;
+    return freeEnd_;
   }
   char* result = free_ + padding;
   free_ = result + bytes;
@@ -124,7 +127,7 @@ void Tree::Destroy() noexcept {
   Block* block = firstBlock_;
   while (block != nullptr) {
     Block* next = block->next;
-    OPENSSL_cleanse(block, block->size);
+    explicit_bzero(block, block->size);
     std::free(block);
     block = next;
   }

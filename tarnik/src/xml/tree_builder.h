@@ -27,8 +27,6 @@ class TreeBuilder {
   }
 
   static TextNode* NewText(Tree& tree, std::string_view text) {
-    // The characters come first: they fill the gap behind an attribute's, which need no alignment
-    // either.
     const std::string_view stored = tree.Store(text);
     auto* node = new (tree.Allocate<TextNode>()) TextNode(tree, NodeKind::kText);
     node->text_ = stored.data();
