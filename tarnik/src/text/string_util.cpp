@@ -1,6 +1,5 @@
 #include <tarnik/text/string_util.h>
 
-#include <openssl/crypto.h>
 #include <openssl/evp.h>
 #include <boost/uuid/random_generator.hpp>
 #include <boost/uuid/uuid_io.hpp>
@@ -8,6 +7,7 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <cstring>
 
 #include <tarnik/core/exception.h>
 
@@ -27,26 +27,43 @@ const unsigned char* AsBytes(const char* text) {
   return reinterpret_cast<const unsigned char*>(text);
 }
 
-constexpr std::array<bool, 256> TableOf(std::string_view characters) {
-  std::array<bool, 256> table{};
-  for (const char character : characters) {
-    table[static_cast<unsigned char>(character)] = true;
+enum CharacterClass : unsigned char { kOther, kSymbol, kPadding, kWhiteSpace };
+
+constexpr std::array<CharacterClass, 256> Classify() {
+  std::array<CharacterClass, 256> classes{};
+  for (const char symbol : kAlphabet) {
+    classes[static_cast<unsigned char>(symbol)] = kSymbol;
   }
-  return table;
+  for (const char space : std::string_view("\t\n\r ")) {
+    classes[static_cast<unsigned char>(space)] = kWhiteSpace;
+  }
+  classes['='] = kPadding;
+  return classes;
 }
 
-constexpr std::array<bool, 256> kIsAlphabet = TableOf(kAlphabet);
-constexpr std::array<bool, 256> kIsWhiteSpace = TableOf("\t\n\r ");
+constexpr std::array<CharacterClass, 256> kClasses = Classify();
 
-std::string WithoutWhiteSpace(std::string_view text) {
-  std::string result(text.size(), '\0');
-  std::size_t count = 0;
+struct CompactText {
+  std::string text;  // without white space
+  std::size_t symbols = 0;
+};
+
+CompactText Compact(std::string_view text) {
+  CompactText result;
+  result.text.resize(text.size());
+  // Locals, since a character that is written could alias the members.
+  char* const start = result.text.data();
+  char* end = start;
+  std::size_t symbols = 0;
   // Each character is written, and the next one over it if it is white space: no branch to miss.
   for (const char character : text) {
-    result[count] = character;
-    count += kIsWhiteSpace[static_cast<unsigned char>(character)] ? 0 : 1;
+    const CharacterClass kind = kClasses[static_cast<unsigned char>(character)];
+    *end = character;
+    end += kind == kWhiteSpace ? 0 : 1;
+    symbols += kind == kSymbol ? 1 : 0;
   }
-  result.resize(count);
+  result.text.resize(static_cast<std::size_t>(end - start));
+  result.symbols = symbols;
   return result;
 }
 
@@ -68,17 +85,14 @@ bool HasZeroTail(std::string_view symbols, std::size_t padding) {
   return (value & unusedBits) == 0;
 }
 
-void CheckBase64(std::string_view text, std::size_t padding) {
-  if (text.size() % 4 != 0) {
+void CheckBase64(const CompactText& compact, std::size_t padding) {
+  if (compact.text.size() % 4 != 0) {
     throw Base64FormatException("The length of the Base64 text is not a multiple of four.");
   }
-  const std::string_view symbols = text.substr(0, text.size() - padding);
-  const bool isBase64 = std::all_of(symbols.begin(), symbols.end(), [](char c) {
-    return kIsAlphabet[static_cast<unsigned char>(c)];
-  });
-  if (!isBase64) {
+  if (compact.symbols + padding != compact.text.size()) {
     throw Base64FormatException("The text holds a character that is not Base64.");
   }
+  const std::string_view symbols(compact.text.data(), compact.symbols);
   if (!HasZeroTail(symbols, padding)) {
     throw Base64FormatException("The Base64 text does not end on a byte boundary.");
   }
@@ -101,9 +115,10 @@ std::string Base64Encode(const std::vector<unsigned char>& bytes) {
 }
 
 void Base64Decode(std::string_view text, std::vector<unsigned char>& bytes) {
-  const std::string compact = WithoutWhiteSpace(text);
+  const CompactText checked = Compact(text);
+  const std::string& compact = checked.text;
   const std::size_t padding = CountPadding(compact);
-  CheckBase64(compact, padding);
+  CheckBase64(checked, padding);
   std::vector<unsigned char> result(compact.size() / 4 * 3);
   std::size_t written = 0;
   for (std::size_t from = 0; from < compact.size(); from += kDecodePiece) {
@@ -134,7 +149,7 @@ std::string ToLower(std::string_view text) {
 }
 
 void Cleanse(std::string& text) noexcept {
-  OPENSSL_cleanse(text.data(), text.capacity());
+  explicit_bzero(text.data(), text.capacity());
   text.clear();
 }
 

@@ -8,6 +8,7 @@
 #include <tarnik/core/exception.h>
 
 #include "xml/namespaces.h"
+#include "xml/short_text.h"
 #include "xml/tree_builder.h"
 #include "xml/xml_chars.h"
 
@@ -76,7 +77,7 @@ std::optional<std::string_view> ElementNode::LookupNamespace(
     }
     for (unsigned index = 0; index < element->attributeCount_; ++index) {
       const Attribute& attribute = element->attributes_[index];
-      if (attribute.name_->isDeclaration && attribute.name_->DeclaredPrefix() == prefix) {
+      if (attribute.name_->isDeclaration && EqualShort(attribute.name_->DeclaredPrefix(), prefix)) {
         return attribute.Value();
       }
     }

@@ -1,7 +1,5 @@
 #include "xml/output_buffer.h"
 
-#include <openssl/crypto.h>
-
 #include <algorithm>
 #include <cstdint>
 
@@ -93,7 +91,7 @@ void AppendEscaped(OutputBuffer& output, std::string_view text, IsSpecial isSpec
 }  // namespace
 
 OutputBuffer::~OutputBuffer() {
-  OPENSSL_cleanse(buffer_.data(), std::max(mostUsed_, used_));
+  explicit_bzero(buffer_.data(), std::max(mostUsed_, used_));
 }
 
 void OutputBuffer::AppendText(std::string_view text) {
