@@ -274,7 +274,7 @@ INSTANTIATE_TEST_SUITE_P(
         RefusedCase{"OtherTokenType", "<wst:TokenType>urn:", "<wst:TokenType>urx:",
                     "wst:InvalidRequest", "Unsupported TokenType: urx:"},
         RefusedCase{"OtherRequestType", "/Issue</wst:RequestType>", "/Renew</wst:RequestType>",
-                    "wst:InvalidRequest", "Unsupported RequestType: "},
+                    "wst:InvalidRequest", "The RequestType does not fit the SOAPAction: "},
         RefusedCase{"UnsignedPublicKey", "/Bearer", "/PublicKey", "wst:InvalidRequest",
                     "PublicKey tokens are not issued to unsigned requests"},
         RefusedCase{"BadBoolean", "Allow=\"true\"", "Allow=\"yes\"", "wst:InvalidRequest",
