@@ -8,6 +8,7 @@
 namespace DevSts {
 namespace {
 
+using Testing::ActAs;
 using Testing::AliceEnvelope;
 using testing::AllOf;
 using Testing::AssertionIn;
@@ -123,10 +124,6 @@ TEST(Server, GrantsNoMoreThanWasAskedFor) {
                              "saml2:Advice", "Delegate "}) {
     EXPECT_THAT(assertion, Not(HasSubstr(absent)));
   }
-}
-
-std::string ActAs(const std::string& assertion) {
-  return "<wst14:ActAs>" + assertion + "</wst14:ActAs>";
 }
 
 TEST(Server, ActsAsTheSubjectOfADelegableToken) {
