@@ -22,9 +22,15 @@ void RequireNothingOfASignature(const SoapRequest& request, const SecurityHeader
   }
 }
 
+// WS-Security 1.1, section 4.2: an xs:ID. Another text could be an expression where a reference to
+// it stands, and would be evaluated there.
 std::string SignedIdOf(const xmlNode* element) {
   RequireAttributes(element, {{"Id", kWsuNamespace}});
-  return AttributeOf(element, "Id", kWsuNamespace);
+  std::string id = AttributeOf(element, "Id", kWsuNamespace);
+  if (xmlValidateNCName(AsXml(id.c_str()), 0) != 0) {
+    ThrowInvalidSecurity(std::string(LocalName(element)) + "/@Id is not an NCName: " + id);
+  }
+  return id;
 }
 
 void RequireTenMinutes(const SecurityHeader& header) {

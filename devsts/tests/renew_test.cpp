@@ -4,6 +4,7 @@
 #include <cstring>
 
 #include "devsts/server.h"
+#include "expect_fault.h"
 #include "raw_client.h"
 #include "signed_request.h"
 
@@ -15,6 +16,7 @@ using Testing::AssertionIn;
 using Testing::ByCertificate;
 using Testing::ByToken;
 using Testing::ElementText;
+using Testing::ExpectFault;
 using testing::HasSubstr;
 using Testing::Holder;
 using Testing::HolderToken;
@@ -31,12 +33,6 @@ using Testing::TimeFromNow;
 std::string AskToRenew(const Server& server, const std::string& token, const Credential& holder,
                        const Testing::Edits& edits = {}) {
   return Ask(server, Sign(ByCertificate(holder, RenewBody(token)), holder, edits), kRenewAction);
-}
-
-void ExpectFault(const std::string& answer, const std::string& code, const std::string& reason) {
-  EXPECT_THAT(answer, StartsWith("HTTP/1.1 500 Internal Server Error\r\n"));
-  EXPECT_EQ(ElementText(answer, "faultcode"), code);
-  EXPECT_THAT(ElementText(answer, "faultstring"), StartsWith(reason));
 }
 
 // Puts the token's whole validity at another time, in seconds from now.

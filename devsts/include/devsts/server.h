@@ -56,7 +56,8 @@ struct ReceivedRequest;
 
 /// Shape of the assertions that are issued.
 struct AssertionOptions {
-  /// The exclusive form's prefix list has the prefixes that stand in xsi:type values only.
+  /// The exclusive form's prefix list has the prefixes that stand in xsi:type values only. A token
+  /// signed in inclusive form is found forged when it comes back inside a request.
   SignOptions signing = DefaultSigning();
   /// Key type of the signing certificate; ECDSA algorithms need an EC key.
   KeyType signingKey = KeyType::Rsa2048;
