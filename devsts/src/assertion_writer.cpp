@@ -1,5 +1,6 @@
 #include "assertion_writer.h"
 
+#include "certificate_values.h"
 #include "namespaces.h"
 
 namespace DevSts {
@@ -8,9 +9,8 @@ namespace {
 constexpr char kUpnFormat[] = "http://schemas.xmlsoap.org/claims/UPN";
 constexpr char kEntityFormat[] = "urn:oasis:names:tc:SAML:2.0:nameid-format:entity";
 constexpr char kBearerMethod[] = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
+constexpr char kHolderOfKeyMethod[] = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 constexpr char kUriNameFormat[] = "urn:oasis:names:tc:SAML:2.0:attrname-format:uri";
-constexpr char kPasswordClass[] =
-    "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport";
 constexpr char kClaims[] = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/";
 
 class AssertionWriter {
@@ -58,12 +58,32 @@ class AssertionWriter {
   void WriteSubject() {
     xml_.Open("saml2:Subject");
     WriteNameId(content_.subject);
-    xml_.Open("saml2:SubjectConfirmation", {{"Method", kBearerMethod}});
+    xml_.Open("saml2:SubjectConfirmation", {{"Method", Method()}});
     if (!content_.delegates.empty()) {
       WriteNameId(content_.delegates.back().name);
     }
-    xml_.Leaf("saml2:SubjectConfirmationData",
-              {{"NotOnOrAfter", TimeToText(content_.notOnOrAfter)}}, "");
+    WriteSubjectConfirmationData();
+    xml_.Close();
+    xml_.Close();
+  }
+
+  const char* Method() const {
+    return content_.holderCertificatePem ? kHolderOfKeyMethod : kBearerMethod;
+  }
+
+  // SAML 2.0 Profiles, section 3.1: the holder's key.
+  void WriteSubjectConfirmationData() {
+    XmlWriter::Attributes attributes{{"NotOnOrAfter", TimeToText(content_.notOnOrAfter)}};
+    if (!content_.holderCertificatePem) {
+      xml_.Leaf("saml2:SubjectConfirmationData", attributes, "");
+      return;
+    }
+    attributes.push_back({"xsi:type", "saml2:KeyInfoConfirmationDataType"});
+    xml_.Open("saml2:SubjectConfirmationData", attributes);
+    xml_.Open("ds:KeyInfo", {{"xmlns:ds", kDsigNamespace}});
+    xml_.Open("ds:X509Data");
+    xml_.Leaf("ds:X509Certificate", CertificateToBase64(*content_.holderCertificatePem));
+    xml_.Close();
     xml_.Close();
     xml_.Close();
   }
@@ -71,20 +91,25 @@ class AssertionWriter {
   void WriteConditions() {
     xml_.Open("saml2:Conditions", {{"NotBefore", TimeToText(content_.notBefore)},
                                    {"NotOnOrAfter", TimeToText(content_.notOnOrAfter)}});
-    if (content_.delegable) {
-      xml_.Leaf("saml2:ProxyRestriction", {{"Count", std::to_string(shape_.proxyCount)}}, "");
+    if (content_.proxyCount) {
+      xml_.Leaf("saml2:ProxyRestriction", {{"Count", std::to_string(*content_.proxyCount)}}, "");
     }
-    if (content_.renewable) {
-      xml_.Leaf("saml2:Condition",
-                {{"Count", std::to_string(shape_.renewCount)},
-                 {"Postdatable", "false"},
-                 {"RenewExpired", "false"},
-                 {"xsi:type", "rsa:RenewRestrictionType"}},
-                "");
-    }
+    WriteRenewal();
     WriteDelegates();
     WriteAudiences();
     xml_.Close();
+  }
+
+  void WriteRenewal() {
+    if (!content_.renewal) {
+      return;
+    }
+    xml_.Leaf("saml2:Condition",
+              {{"Count", std::to_string(content_.renewal->count)},
+               {"Postdatable", content_.renewal->postdatable ? "true" : "false"},
+               {"RenewExpired", content_.renewal->renewExpired ? "true" : "false"},
+               {"xsi:type", "rsa:RenewRestrictionType"}},
+              "");
   }
 
   // SAML 2.0 Condition for Delegation Restriction, section 2.
@@ -128,9 +153,9 @@ class AssertionWriter {
   }
 
   void WriteAuthnStatement() {
-    xml_.Open("saml2:AuthnStatement", {{"AuthnInstant", TimeToText(content_.issued)}});
+    xml_.Open("saml2:AuthnStatement", {{"AuthnInstant", TimeToText(content_.authenticated)}});
     xml_.Open("saml2:AuthnContext");
-    xml_.Leaf("saml2:AuthnContextClassRef", kPasswordClass);
+    xml_.Leaf("saml2:AuthnContextClassRef", content_.authenticationClass);
     xml_.Close();
     xml_.Close();
   }

@@ -16,6 +16,13 @@ struct DelegateEntry {
   Time instant;
 };
 
+// Under which conditions a token may be renewed.
+struct RenewRestriction {
+  unsigned count = 0;  // 0: not any more
+  bool postdatable = false;
+  bool renewExpired = false;
+};
+
 // Everything that an assertion says.
 struct TokenContent {
   std::string id;
@@ -24,12 +31,16 @@ struct TokenContent {
   Time issued;
   Time notBefore;
   Time notOnOrAfter;
-  bool renewable = false;
-  bool delegable = false;
+  // PEM; makes the token a holder-of-key one.
+  std::optional<std::string> holderCertificatePem;
+  std::optional<RenewRestriction> renewal;
+  std::optional<unsigned> proxyCount;
   std::vector<DelegateEntry> delegates;
   std::vector<std::string> audiences;
   std::vector<AdviceRequest> advice;
   User user;
+  Time authenticated;
+  std::string authenticationClass;
 };
 
 // Namespace declarations that assertions need, for the element that carries them.

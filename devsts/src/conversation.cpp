@@ -70,15 +70,15 @@ void Conversation::Record(ReceivedRequest& request, const SoapReply& reply, cons
   request.tlsVersion = connection_.TlsVersion();
   request.serverName = connection_.ServerName();
   request.peerCertificatePem = connection_.PeerCertificatePem();
+  request.signature = reply.signature;
   request.answeredStatus = wire.status;
   request.answeredFault = reply.faultString;
-  const bool issued = !reply.isFault && !reply.envelope.empty();
   if (parts_.onRequest) {
     parts_.onRequest(request);
   }
   parts_.observation.Add(request, [&](Counters& counters) {
     ++counters.requests;
-    counters.tokensIssued += issued ? 1 : 0;
+    counters.tokensIssued += reply.holdsToken ? 1 : 0;
     counters.faults += reply.isFault ? 1 : 0;
     counters.delayed += misbehavior.delayBeforeAnswer.count() > 0 ? 1 : 0;
   });

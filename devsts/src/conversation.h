@@ -15,7 +15,7 @@ namespace DevSts {
 
 // What every conversation shares.
 struct ConversationParts {
-  const Service& service;
+  Service& service;
   MisbehaviorPlan& plan;
   Observation& observation;
   const std::function<void(const ReceivedRequest&)>& onRequest;

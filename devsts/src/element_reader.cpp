@@ -88,6 +88,20 @@ std::string TextOf(const xmlNode* element) {
   return ContentOf(element);
 }
 
+void RequireText(const xmlNode* element, const std::string& expected) {
+  const std::string text = PlainText(element);
+  if (text != expected) {
+    ThrowInvalidRequest("Unsupported " + NameOf(element) + ": " + text);
+  }
+}
+
+void RequireRequestType(const xmlNode* element, const std::string& expected) {
+  const std::string text = PlainText(element);
+  if (text != expected) {
+    ThrowInvalidRequest("The RequestType does not fit the SOAPAction: " + text);
+  }
+}
+
 bool BooleanOf(const std::string& text, const std::string& place) {
   if (text != "true" && text != "false") {
     ThrowInvalidRequest(place + " is neither true nor false");

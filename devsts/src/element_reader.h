@@ -42,6 +42,10 @@ void RequireAttributes(const xmlNode* element, const std::vector<AttributeName>&
 std::string PlainText(const xmlNode* element);
 // Text of an element without child elements; its attributes are the caller's business.
 std::string TextOf(const xmlNode* element);
+// PlainText that must be this: anything else is "Unsupported", by the element's name.
+void RequireText(const xmlNode* element, const std::string& expected);
+// The same for wst:RequestType, which says what the SOAPAction said.
+void RequireRequestType(const xmlNode* element, const std::string& expected);
 // "true" or "false" in an element of plain text or an attribute.
 bool BooleanOf(const std::string& text, const std::string& place);
 

@@ -12,12 +12,28 @@ void ThrowFailedAuthentication(const std::string& faultString) {
   throw Fault(kTrustNamespace, "FailedAuthentication", faultString);
 }
 
+void ThrowInvalidTimeRange(const std::string& faultString) {
+  throw Fault(kTrustNamespace, "InvalidTimeRange", faultString);
+}
+
+void ThrowUnableToRenew(const std::string& faultString) {
+  throw Fault(kTrustNamespace, "UnableToRenew", faultString);
+}
+
 void ThrowInvalidSecurity(const std::string& faultString) {
   throw Fault(kWsseNamespace, "InvalidSecurity", faultString);
 }
 
 void ThrowInvalidSecurityToken(const std::string& faultString) {
   throw Fault(kWsseNamespace, "InvalidSecurityToken", faultString);
+}
+
+void ThrowUnsupportedAlgorithm(const std::string& faultString) {
+  throw Fault(kWsseNamespace, "UnsupportedAlgorithm", faultString);
+}
+
+void ThrowFailedCheck(const std::string& faultString) {
+  throw Fault(kWsseNamespace, "FailedCheck", faultString);
 }
 
 void ThrowMessageExpired(const std::string& faultString) {

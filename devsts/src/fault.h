@@ -30,9 +30,13 @@ class Fault : public std::runtime_error {
 // WS-Trust 1.3, section 11.
 [[noreturn]] void ThrowInvalidRequest(const std::string& faultString);
 [[noreturn]] void ThrowFailedAuthentication(const std::string& faultString);
+[[noreturn]] void ThrowInvalidTimeRange(const std::string& faultString);
+[[noreturn]] void ThrowUnableToRenew(const std::string& faultString);
 // WS-Security 1.1, section 12.
 [[noreturn]] void ThrowInvalidSecurity(const std::string& faultString);
 [[noreturn]] void ThrowInvalidSecurityToken(const std::string& faultString);
+[[noreturn]] void ThrowUnsupportedAlgorithm(const std::string& faultString);
+[[noreturn]] void ThrowFailedCheck(const std::string& faultString);
 [[noreturn]] void ThrowMessageExpired(const std::string& faultString);
 
 }  // namespace DevSts

@@ -5,6 +5,7 @@
 #include "element_reader.h"
 #include "fault.h"
 #include "namespaces.h"
+#include "signature_shape.h"
 #include "xml_library.h"
 
 namespace DevSts {
@@ -13,13 +14,6 @@ namespace {
 constexpr char kIssueType[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/Issue";
 constexpr char kBearerKey[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/Bearer";
 constexpr char kPublicKey[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/PublicKey";
-
-void RequireText(const xmlNode* element, const std::string& expected) {
-  const std::string text = PlainText(element);
-  if (text != expected) {
-    ThrowInvalidRequest("Unsupported " + std::string(LocalName(element)) + ": " + text);
-  }
-}
 
 bool ReadKeyType(const xmlNode* element) {
   const std::string text = PlainText(element);
@@ -135,6 +129,15 @@ std::vector<AdviceRequest> ReadAdviceSet(xmlNode* element, const char* adviceNam
   return advice;
 }
 
+void ReadUseKey(xmlNode* element) {
+  RequireAttributes(element, {{"Sig"}});
+  ElementReader(element).End();
+  const std::string signature = AttributeOf(element, "Sig");
+  if (signature != kProofSignatureId) {
+    ThrowInvalidRequest("UseKey/@Sig does not name the request's signature: " + signature);
+  }
+}
+
 void ReadOptionalParts(ElementReader& reader, const std::string& vendorHost,
                        IssueRequest& request) {
   if (xmlNode* delegateTo = reader.Optional(kTrustNamespace, "DelegateTo")) {
@@ -150,6 +153,10 @@ void ReadOptionalParts(ElementReader& reader, const std::string& vendorHost,
       "http://" + vendorHost + "/names/2009/12/std-ext/WS-Trust1.4/advice";
   if (xmlNode* adviceSet = reader.Optional(adviceNamespace.c_str(), "AdviceSet")) {
     request.advice = ReadAdviceSet(adviceSet, adviceNamespace.c_str());
+  }
+  if (xmlNode* useKey = reader.Optional(kTrustNamespace, "UseKey")) {
+    ReadUseKey(useKey);
+    request.usesKey = true;
   }
 }
 
@@ -168,7 +175,7 @@ IssueRequest ReadIssueRequest(xmlNode* requestSecurityToken, const std::string& 
   ElementReader reader(requestSecurityToken);
   IssueRequest request;
   RequireText(reader.Expect(kTrustNamespace, "TokenType"), kSamlNamespace);
-  RequireText(reader.Expect(kTrustNamespace, "RequestType"), kIssueType);
+  RequireRequestType(reader.Expect(kTrustNamespace, "RequestType"), kIssueType);
   request.publicKey = ReadKeyType(reader.Expect(kTrustNamespace, "KeyType"));
   xmlNode* lifetime = reader.Expect(kTrustNamespace, "Lifetime");
   RequireAttributes(lifetime, {});

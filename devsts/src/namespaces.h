@@ -10,6 +10,8 @@ inline constexpr char kWsseNamespace[] =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
 inline constexpr char kWsuNamespace[] =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
+inline constexpr char kWsse11Namespace[] =
+    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.1.xsd";
 inline constexpr char kAddressingNamespace[] = "http://www.w3.org/2005/08/addressing";
 inline constexpr char kSamlNamespace[] = "urn:oasis:names:tc:SAML:2.0:assertion";
 inline constexpr char kDelegationNamespace[] = "urn:oasis:names:tc:SAML:2.0:conditions:delegation";

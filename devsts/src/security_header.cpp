@@ -32,17 +32,26 @@ xmlNode* OnlySecurity(xmlNode* soapHeader) {
   return found;
 }
 
-void ReadUsernameToken(xmlNode* token, SecurityHeader& header) {
-  RequireAttributes(token, {});
-  ElementReader reader(token);
-  header.userName = PlainText(reader.Expect(kWsseNamespace, "Username"));
+UserNameToken ReadUsernameToken(xmlNode* element) {
+  RequireAttributes(element, {});
+  ElementReader reader(element);
+  UserNameToken token;
+  token.userName = PlainText(reader.Expect(kWsseNamespace, "Username"));
   const xmlNode* password = reader.Expect(kWsseNamespace, "Password");
   RequireAttributes(password, {{"Type"}});
   if (AttributeOf(password, "Type") != kPasswordText) {
     ThrowInvalidSecurity("Password/@Type is not PasswordText");
   }
-  header.password = TextOf(password);
+  token.password = TextOf(password);
   reader.End();
+  return token;
+}
+
+void ReadSignature(ElementReader& reader, SecurityHeader& header) {
+  header.signature = reader.Optional(kDsigNamespace, "Signature");
+  if (header.signature != nullptr && !reader.AtEnd()) {
+    ThrowInvalidSecurity("The Signature is not the last element of Security");
+  }
 }
 
 }  // namespace
@@ -52,17 +61,17 @@ SecurityHeader ReadSecurityHeader(xmlNode* soapHeader) {
   RequireAttributes(security, {});
   ElementReader reader(security);
   SecurityHeader header;
-  xmlNode* timestamp = reader.Optional(kWsuNamespace, "Timestamp");
-  if (timestamp == nullptr) {
+  header.timestamp = reader.Optional(kWsuNamespace, "Timestamp");
+  if (header.timestamp == nullptr) {
     ThrowInvalidSecurity("The Security header does not begin with a Timestamp");
   }
-  RequireAttributes(timestamp, {});
-  std::tie(header.created, header.expires) = ReadPeriod(timestamp);
-  xmlNode* token = reader.Optional(kWsseNamespace, "UsernameToken");
-  if (token == nullptr) {
-    ThrowInvalidSecurity("No UsernameToken behind the Timestamp");
+  std::tie(header.created, header.expires) = ReadPeriod(header.timestamp);
+  if (xmlNode* token = reader.Optional(kWsseNamespace, "UsernameToken")) {
+    header.userNameToken = ReadUsernameToken(token);
   }
-  ReadUsernameToken(token, header);
+  header.assertion = reader.Optional(kSamlNamespace, "Assertion");
+  header.certificateToken = reader.Optional(kWsseNamespace, "BinarySecurityToken");
+  ReadSignature(reader, header);
   reader.End();
   return header;
 }

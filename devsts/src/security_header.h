@@ -3,21 +3,30 @@
 
 #include <libxml/tree.h>
 
+#include <optional>
 #include <string>
 
 #include "time_text.h"
 
 namespace DevSts {
 
-// wsse:Security as it stands in a request made with a user's name and password.
-struct SecurityHeader {
-  Time created;
-  Time expires;
+struct UserNameToken {
   std::string userName;
   std::string password;
 };
 
-// Reads the SOAP Header's only entry (WS-Security 1.1, sections 5 and 10; UsernameToken
+// wsse:Security as it stands in a request. Nodes are owned by the request's document.
+struct SecurityHeader {
+  xmlNode* timestamp = nullptr;
+  Time created;
+  Time expires;
+  std::optional<UserNameToken> userNameToken;
+  xmlNode* assertion = nullptr;
+  xmlNode* certificateToken = nullptr;
+  xmlNode* signature = nullptr;
+};
+
+// Reads the SOAP Header's only entry (WS-Security 1.1, sections 5 to 8 and 10; UsernameToken
 // Profile 1.1, section 3.1). Throws Fault.
 SecurityHeader ReadSecurityHeader(xmlNode* soapHeader);
 

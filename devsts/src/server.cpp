@@ -146,6 +146,14 @@ void Server::SetUsers(Users users) {
   impl_->service.SetUsers(std::move(users));
 }
 
+void Server::RegisterCertificate(const std::string& userName, const std::string& certificatePem) {
+  impl_->service.RegisterCertificate(userName, certificatePem);
+}
+
+bool Server::Revoke(const std::string& assertionId) {
+  return impl_->service.Revoke(assertionId);
+}
+
 void Server::SetAssertionOptions(AssertionOptions options) {
   impl_->service.SetAssertionOptions(std::move(options));
 }

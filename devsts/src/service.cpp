@@ -1,17 +1,11 @@
 #include "service.h"
 
-#include <openssl/crypto.h>
-#include <openssl/rand.h>
-
-#include <algorithm>
-#include <array>
-#include <cstdio>
 #include <utility>
 
-#include "act_as.h"
 #include "fault.h"
+#include "key_reference.h"
 #include "namespaces.h"
-#include "openssl_handles.h"
+#include "request_signature.h"
 #include "security_header.h"
 #include "soap_answer.h"
 #include "soap_request.h"
@@ -19,21 +13,7 @@
 namespace DevSts {
 namespace {
 
-constexpr char kIssueAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
-
-std::string MakeId() {
-  std::array<unsigned char, 16> octets{};
-  if (RAND_bytes(octets.data(), octets.size()) != 1) {
-    ThrowOpenSslError("random ID");
-  }
-  std::string id = "_";
-  for (const unsigned char octet : octets) {
-    std::array<char, 3> hex{};
-    std::snprintf(hex.data(), hex.size(), "%02x", octet);
-    id += hex.data();
-  }
-  return id;
-}
+constexpr char kActions[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/";
 
 void RequireFresh(const SecurityHeader& header, Time now, std::chrono::seconds skew) {
   if (header.created > now + skew) {
@@ -47,69 +27,61 @@ void RequireFresh(const SecurityHeader& header, Time now, std::chrono::seconds s
   }
 }
 
-// WS-Trust 1.3, section 11, InvalidTimeRange.
-void RequireSensibleLifetime(const IssueRequest& request, Time now, std::chrono::seconds skew) {
-  if (request.expires <= request.created) {
-    throw Fault(kTrustNamespace, "InvalidTimeRange", "The Lifetime is not positive");
-  }
-  if (request.created > now + skew) {
-    throw Fault(kTrustNamespace, "InvalidTimeRange", "The Lifetime begins in the future");
-  }
-}
-
-bool IsPrincipalName(const std::string& name) {
-  const std::size_t at = name.rfind('@');
-  return at != std::string::npos && at != 0 && at + 1 != name.size();
-}
-
-bool Equal(const std::string& left, const std::string& right) {
-  return left.size() == right.size() && CRYPTO_memcmp(left.data(), right.data(), left.size()) == 0;
-}
-
-TokenContent ContentFor(const IssueRequest& request, const AssertionOptions& shape, Time now) {
-  TokenContent content;
-  content.id = MakeId();
-  content.issued = now;
-  content.notBefore = now - shape.notBeforeOffset;
-  const auto longest = std::chrono::duration_cast<std::chrono::milliseconds>(shape.maxLifetime);
-  content.notOnOrAfter = now + std::min(request.expires - request.created, longest);
-  content.renewable = request.renewable;
-  content.delegable = request.delegable;
-  content.audiences = request.audiences;
-  content.advice = request.advice;
-  return content;
-}
-
 }  // namespace
 
 Service::Service(const ServerOptions& options, Credential signing)
-    : clockSkew_(options.clockSkew),
-      identity_{options.issuer, options.vendorHost, options.solutionHost, std::move(signing)},
-      users_(options.users),
+    : parts_{options.clockSkew,
+             {options.issuer, options.vendorHost, options.solutionHost, std::move(signing)},
+             Accounts(options.users),
+             TokenStore(options.issuedTokenLimit)},
       shape_(options.assertion) {}
 
-SoapReply Service::Answer(const ReceivedRequest& request) const {
+SoapReply Service::Answer(const ReceivedRequest& request) {
+  RequestSignature seen = RequestSignature::None;
+  SoapReply reply;
   try {
-    const std::string action = ReadSoapAction(request);
-    if (action == kIssueAction) {
-      return {200, Issue(request), {}, false};
-    }
-    ThrowInvalidRequest("Unsupported SOAPAction: " + action);
+    reply = Handle(request, seen);
   } catch (const Fault& fault) {
-    return AnswerFault(fault.Answer());
+    reply = AnswerFault(fault.Answer());
   } catch (const std::exception& error) {
-    return AnswerFault(
+    reply = AnswerFault(
         {kSoapNamespace, "Server", std::string("The service failed: ") + error.what(), false, 500});
   }
+  reply.signature = seen;
+  return reply;
+}
+
+SoapReply Service::Handle(const ReceivedRequest& received, RequestSignature& seen) {
+  const std::string action = ReadSoapAction(received);
+  const bool issues = action == std::string(kActions) + "Issue";
+  const bool renews = action == std::string(kActions) + "Renew";
+  const bool validates = action == std::string(kActions) + "Validate";
+  if (!issues && !renews && !validates) {
+    ThrowInvalidRequest("Unsupported SOAPAction: " + action);
+  }
+  CheckedRequest request{ReadEnvelope(received.body), {}, {}, Shape(), Now()};
+  request.header = ReadSecurityHeader(request.soap.header);
+  seen = SignatureFormOf(request.header);
+  RequireFresh(request.header, request.now, parts_.clockSkew);
+  request.proof = CheckRequestSignature(request.soap, request.header);
+
+  SoapReply reply;
+  reply.holdsToken = !validates;
+  if (validates) {
+    reply.envelope = Validate(request, parts_);
+  } else {
+    reply.envelope = renews ? Renew(request, parts_) : Issue(request, parts_);
+  }
+  return reply;
 }
 
 SoapReply Service::AnswerFault(const FaultAnswer& fault) {
-  return {fault.httpStatus, WriteFaultEnvelope(fault), fault.faultString, true};
-}
-
-void Service::SetUsers(Users users) {
-  const std::lock_guard lock(mutex_);
-  users_ = std::move(users);
+  SoapReply reply;
+  reply.status = fault.httpStatus;
+  reply.envelope = WriteFaultEnvelope(fault);
+  reply.faultString = fault.faultString;
+  reply.isFault = true;
+  return reply;
 }
 
 void Service::SetAssertionOptions(AssertionOptions options) {
@@ -120,50 +92,6 @@ void Service::SetAssertionOptions(AssertionOptions options) {
 AssertionOptions Service::Shape() const {
   const std::lock_guard lock(mutex_);
   return shape_;
-}
-
-User Service::Authenticate(const std::string& name, const std::string& password) const {
-  const std::lock_guard lock(mutex_);
-  const auto found = users_.find(name);
-  if (found == users_.end() || !Equal(found->second.password, password)) {
-    ThrowFailedAuthentication("Invalid credentials");
-  }
-  if (found->second.passwordExpired) {
-    ThrowFailedAuthentication("Password of the user logging on is expired. :: " + name);
-  }
-  return found->second;
-}
-
-std::string Service::Issue(const ReceivedRequest& received) const {
-  const Time now = Now();
-  const SoapRequest soap = ReadEnvelope(received.body);
-  const SecurityHeader header = ReadSecurityHeader(soap.header);
-  RequireFresh(header, now, clockSkew_);
-  const IssueRequest request = ReadIssueRequest(soap.bodyEntry, identity_.vendorHost);
-  RequireSensibleLifetime(request, now, clockSkew_);
-  const User user = Authenticate(header.userName, header.password);
-  if (request.publicKey) {
-    ThrowInvalidRequest("PublicKey tokens are not issued to unsigned requests");
-  }
-
-  const AssertionOptions shape = Shape();
-  TokenContent content = ContentFor(request, shape, now);
-  content.issuer = identity_.issuer;
-  content.subject = header.userName;
-  content.user = user;
-  if (request.actAs != nullptr) {
-    ActAs(request.actAs, header.userName, identity_.signing.certificatePem, content);
-    const std::lock_guard lock(mutex_);
-    const auto subject = users_.find(content.subject);
-    content.user = subject != users_.end() ? subject->second : User();
-  }
-  if (request.delegateTo) {
-    if (!IsPrincipalName(*request.delegateTo)) {
-      ThrowInvalidRequest("DelegateTo is not a user principal name: " + *request.delegateTo);
-    }
-    content.delegates.push_back({*request.delegateTo, now});
-  }
-  return IssueToken(content, shape, identity_);
 }
 
 }  // namespace DevSts

@@ -5,8 +5,7 @@
 #include <string>
 
 #include "devsts/server.h"
-#include "issue_request.h"
-#include "token_issuer.h"
+#include "operations.h"
 
 namespace DevSts {
 
@@ -16,6 +15,9 @@ struct SoapReply {
   std::string envelope;
   std::string faultString;  // of a fault
   bool isFault = false;
+  bool holdsToken = false;
+  // How the request was seen to be signed.
+  RequestSignature signature = RequestSignature::None;
 };
 
 // The service itself: requests in, envelopes out, no network. Safe on any thread.
@@ -23,21 +25,22 @@ class Service {
  public:
   Service(const ServerOptions& options, Credential signing);
 
-  SoapReply Answer(const ReceivedRequest& request) const;
+  SoapReply Answer(const ReceivedRequest& request);
   static SoapReply AnswerFault(const FaultAnswer& fault);
 
-  void SetUsers(Users users);
+  void SetUsers(Users users) { parts_.accounts.Set(std::move(users)); }
+  void RegisterCertificate(const std::string& userName, const std::string& certificatePem) {
+    parts_.accounts.AddCertificate(userName, certificatePem);
+  }
+  bool Revoke(const std::string& assertionId) { return parts_.tokens.Revoke(assertionId); }
   void SetAssertionOptions(AssertionOptions options);
 
  private:
-  std::string Issue(const ReceivedRequest& request) const;
-  User Authenticate(const std::string& name, const std::string& password) const;
+  SoapReply Handle(const ReceivedRequest& request, RequestSignature& seen);
   AssertionOptions Shape() const;
 
-  const std::chrono::seconds clockSkew_;
-  const IssuerIdentity identity_;
+  ServiceParts parts_;
   mutable std::mutex mutex_;
-  Users users_;
   AssertionOptions shape_;
 };
 

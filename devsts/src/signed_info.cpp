@@ -2,11 +2,11 @@
 
 #include <openssl/rsa.h>
 
-#include <algorithm>
 #include <sstream>
 #include <vector>
 
 #include "algorithms.h"
+#include "base64.h"
 #include "canonical_form.h"
 #include "namespaces.h"
 #include "xml_library.h"
@@ -15,28 +15,6 @@ namespace DevSts {
 namespace {
 
 using Octets = std::vector<unsigned char>;
-
-std::string Base64(const Octets& octets) {
-  std::string text(4 * ((octets.size() + 2) / 3) + 1, '\0');
-  const int size = EVP_EncodeBlock(reinterpret_cast<unsigned char*>(text.data()), octets.data(),
-                                   static_cast<int>(octets.size()));
-  text.resize(static_cast<std::size_t>(size));
-  return text;
-}
-
-Octets FromBase64(std::string text) {
-  std::erase_if(text, [](char c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; });
-  const auto padding = static_cast<std::size_t>(std::count(text.begin(), text.end(), '='));
-  Octets octets(text.size() / 4 * 3);
-  const int size =
-      EVP_DecodeBlock(octets.data(), reinterpret_cast<const unsigned char*>(text.data()),
-                      static_cast<int>(text.size()));
-  if (size < 0 || padding > 2) {
-    throw XmlError("SignatureValue is not Base64");
-  }
-  octets.resize(static_cast<std::size_t>(size) - padding);
-  return octets;
-}
 
 void UsePss(EVP_PKEY_CTX* context) {
   if (EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PSS_PADDING) <= 0 ||
@@ -117,7 +95,7 @@ void WritePssSignatureValue(xmlNode* signature, std::string_view keyPem) {
     ThrowOpenSslError("RSA-PSS signature");
   }
   octets.resize(size);
-  xmlNodeSetContent(SignatureChild(signature, "SignatureValue"), AsXml(Base64(octets).c_str()));
+  xmlNodeSetContent(SignatureChild(signature, "SignatureValue"), AsXml(ToBase64(octets).c_str()));
 }
 
 bool PssSignatureValueIsRight(xmlNode* signature, std::string_view certificatePem) {

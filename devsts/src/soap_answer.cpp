@@ -38,14 +38,17 @@ std::string WriteFaultEnvelope(const FaultAnswer& fault) {
   return xml.Text();
 }
 
-std::string WriteIssueEnvelope(const std::string& assertion, Time created, Time expires,
-                               const XmlWriter::Attributes& declarations, bool indent) {
+std::string WriteTokenEnvelope(TokenAnswer kind, const std::string& assertion, Time created,
+                               Time expires, const XmlWriter::Attributes& declarations,
+                               bool indent) {
   XmlWriter xml(indent);
   XmlWriter::Attributes attributes{{"xmlns:soapenv", kSoapNamespace}};
   attributes.insert(attributes.end(), declarations.begin(), declarations.end());
   xml.Open("soapenv:Envelope", attributes);
-  xml.Open("soapenv:Body");
-  xml.Open("wst:RequestSecurityTokenResponseCollection", {{"xmlns:wst", kTrustNamespace}});
+  xml.Open("soapenv:Body", {{"xmlns:wst", kTrustNamespace}});
+  if (kind == TokenAnswer::Issued) {
+    xml.Open("wst:RequestSecurityTokenResponseCollection");
+  }
   xml.Open("wst:RequestSecurityTokenResponse");
   xml.Leaf("wst:TokenType", kSamlNamespace);
   xml.Open("wst:Lifetime", {{"xmlns:wsu", kWsuNamespace}});
@@ -55,6 +58,27 @@ std::string WriteIssueEnvelope(const std::string& assertion, Time created, Time 
   xml.Open("wst:RequestedSecurityToken");
   xml.Raw(assertion);
   xml.Close();
+  xml.Close();
+  if (kind == TokenAnswer::Issued) {
+    xml.Close();
+  }
+  xml.Close();
+  xml.Close();
+  return xml.Text();
+}
+
+std::string WriteStatusEnvelope(bool valid, const std::string& reason) {
+  const std::string trust = kTrustNamespace;
+  XmlWriter xml;
+  xml.Open("soapenv:Envelope", {{"xmlns:soapenv", kSoapNamespace}});
+  xml.Open("soapenv:Body");
+  xml.Open("wst:RequestSecurityTokenResponse", {{"xmlns:wst", trust}});
+  xml.Leaf("wst:TokenType", trust + "/RSTR/Status");
+  xml.Open("wst:Status");
+  xml.Leaf("wst:Code", trust + (valid ? "/status/valid" : "/status/invalid"));
+  if (!reason.empty()) {
+    xml.Leaf("wst:Reason", reason);
+  }
   xml.Close();
   xml.Close();
   xml.Close();

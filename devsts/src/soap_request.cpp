@@ -30,6 +30,15 @@ DocumentHandle ParseEnvelope(const std::string& body) {
   }
 }
 
+// WS-Security 1.1, section 4.2: an id is unique in its document.
+void RegisterUniqueIds(xmlDoc* document) {
+  try {
+    RegisterIds(document);
+  } catch (const XmlError& error) {
+    ThrowInvalidSecurity(std::string("The request is ambiguous: ") + error.what());
+  }
+}
+
 }  // namespace
 
 std::string ReadSoapAction(const ReceivedRequest& request) {
@@ -54,10 +63,10 @@ SoapRequest ReadEnvelope(const std::string& body) {
   RequireAttributes(envelope, {});
   ElementReader reader(envelope);
   request.header = reader.Expect(kSoapNamespace, "Header");
-  xmlNode* soapBody = reader.Expect(kSoapNamespace, "Body");
+  request.body = reader.Expect(kSoapNamespace, "Body");
   reader.End();
-  RequireAttributes(soapBody, {});
-  ElementReader bodyReader(soapBody);
+  RegisterUniqueIds(request.document.get());
+  ElementReader bodyReader(request.body);
   if (bodyReader.AtEnd()) {
     ThrowInvalidRequest("The Body is empty");
   }

@@ -12,6 +12,7 @@ namespace DevSts {
 struct SoapRequest {
   DocumentHandle document;
   xmlNode* header = nullptr;
+  xmlNode* body = nullptr;
   xmlNode* bodyEntry = nullptr;
 };
 
@@ -19,7 +20,7 @@ struct SoapRequest {
 // Throws Fault.
 std::string ReadSoapAction(const ReceivedRequest& request);
 
-// Throws Fault.
+// The ids of the document are registered with it afterwards. Throws Fault.
 SoapRequest ReadEnvelope(const std::string& body);
 
 }  // namespace DevSts

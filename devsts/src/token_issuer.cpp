@@ -2,8 +2,6 @@
 
 #include <stdexcept>
 
-#include "soap_answer.h"
-
 namespace DevSts {
 namespace {
 
@@ -36,8 +34,8 @@ void EditAssertion(std::string& envelope, const std::function<void(std::string&)
 
 }  // namespace
 
-std::string IssueToken(const TokenContent& content, const AssertionOptions& shape,
-                       const IssuerIdentity& identity) {
+IssuedAnswer IssueToken(const TokenContent& content, const AssertionOptions& shape,
+                        const IssuerIdentity& identity, TokenAnswer kind) {
   std::string assertion =
       WriteAssertion(content, shape, identity.vendorHost, identity.solutionHost);
   if (shape.beforeSigning) {
@@ -47,18 +45,19 @@ std::string IssueToken(const TokenContent& content, const AssertionOptions& shap
   if (shape.inheritNamespaces) {
     declarations = AssertionNamespaces(identity.vendorHost);
   }
+  IssuedAnswer answer{{}, FirstIdIn(assertion)};
   SignOptions signing = shape.signing;
   if (signing.id.empty()) {
-    signing.id = FirstIdIn(assertion);
+    signing.id = answer.assertionId;
   }
-  const std::string unsignedEnvelope = WriteIssueEnvelope(
-      assertion, content.issued, content.notOnOrAfter, declarations, shape.indent);
-  std::string envelope = SignXml(unsignedEnvelope, identity.signing.privateKeyPem,
-                                 identity.signing.certificatePem, signing);
+  const std::string unsignedEnvelope = WriteTokenEnvelope(
+      kind, assertion, content.notBefore, content.notOnOrAfter, declarations, shape.indent);
+  answer.envelope = SignXml(unsignedEnvelope, identity.signing.privateKeyPem,
+                            identity.signing.certificatePem, signing);
   if (shape.afterSigning) {
-    EditAssertion(envelope, shape.afterSigning);
+    EditAssertion(answer.envelope, shape.afterSigning);
   }
-  return envelope;
+  return answer;
 }
 
 }  // namespace DevSts

@@ -4,6 +4,7 @@
 #include <string>
 
 #include "assertion_writer.h"
+#include "soap_answer.h"
 
 namespace DevSts {
 
@@ -15,10 +16,16 @@ struct IssuerIdentity {
   Credential signing;
 };
 
-// Makes the envelope of an Issue answer with a signed assertion. The signature is made in its
-// place, so that it holds there under inclusive canonical form, too.
-std::string IssueToken(const TokenContent& content, const AssertionOptions& shape,
-                       const IssuerIdentity& identity);
+// An answer's envelope, and the ID that its assertion came to have.
+struct IssuedAnswer {
+  std::string envelope;
+  std::string assertionId;
+};
+
+// Makes the envelope of an answer with a signed assertion. The signature is made in its place, so
+// that it holds there under inclusive canonical form, too.
+IssuedAnswer IssueToken(const TokenContent& content, const AssertionOptions& shape,
+                        const IssuerIdentity& identity, TokenAnswer kind);
 
 }  // namespace DevSts
 

@@ -15,9 +15,23 @@ constexpr char kPasswordText[] =
     "http://docs.oasis-open.org/wss/2004/01/"
     "oasis-200401-wss-username-token-profile-1.0#PasswordText";
 
-std::string Period(const std::string& element, long seconds) {
-  return "<" + element + " xmlns:wsu=\"" + kWsu + "\"><wsu:Created>" + TimeFromNow(0) +
-         "</wsu:Created><wsu:Expires>" + TimeFromNow(seconds) + "</wsu:Expires></" + element + ">";
+constexpr char kSoap[] = "http://schemas.xmlsoap.org/soap/envelope/";
+constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
+constexpr char kTrust14[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200802";
+constexpr char kSaml[] = "urn:oasis:names:tc:SAML:2.0:assertion";
+
+std::string Period(const std::string& element, long created, long expires) {
+  return "<" + element + " xmlns:wsu=\"" + kWsu + "\"><wsu:Created>" + TimeFromNow(created) +
+         "</wsu:Created><wsu:Expires>" + TimeFromNow(expires) + "</wsu:Expires></" + element + ">";
+}
+
+std::string Leaf(const std::string& name, const std::string& text) {
+  return "<wst:" + name + ">" + text + "</wst:" + name + ">";
+}
+
+std::string Request(const std::string& content) {
+  return std::string("<wst:RequestSecurityToken xmlns:wst=\"") + kTrust + "\" xmlns:wst14=\"" +
+         kTrust14 + "\">" + content + "</wst:RequestSecurityToken>";
 }
 
 }  // namespace
@@ -31,24 +45,54 @@ std::string TimeFromNow(long seconds) {
   return text.data();
 }
 
+std::string IssueBody(const std::string& keyType, const std::string& more) {
+  const std::string trust = kTrust;
+  return Request(Leaf("TokenType", kSaml) + Leaf("RequestType", trust + "/Issue") +
+                 Leaf("KeyType", trust + "/" + keyType) + Period("wst:Lifetime", 0, 3600) +
+                 "<wst:Renewing Allow=\"true\" OK=\"false\"/>" + Leaf("Delegatable", "true") +
+                 more);
+}
+
+std::string RenewBody(const std::string& assertion, long seconds) {
+  return Request(Leaf("TokenType", kSaml) + Leaf("RequestType", std::string(kTrust) + "/Renew") +
+                 Period("wst:Lifetime", 0, seconds) + Leaf("RenewTarget", assertion));
+}
+
+std::string ValidateBody(const std::string& assertion) {
+  const std::string trust = kTrust;
+  return Request(Leaf("TokenType", trust + "/RSTR/Status") +
+                 Leaf("RequestType", trust + "/Validate") + Leaf("ValidateTarget", assertion));
+}
+
+std::string DelegateTo(const std::string& user) {
+  return std::string("<wst:DelegateTo><wsse:UsernameToken xmlns:wsse=\"") + kWsse +
+         "\"><wsse:Username>" + user + "</wsse:Username></wsse:UsernameToken></wst:DelegateTo>";
+}
+
+std::string ActAs(const std::string& assertion) {
+  return "<wst14:ActAs>" + assertion + "</wst14:ActAs>";
+}
+
+std::string UsernameToken(const std::string& user, const std::string& password) {
+  return std::string("<wsse:UsernameToken xmlns:wsse=\"") + kWsse + "\"><wsse:Username>" + user +
+         "</wsse:Username><wsse:Password Type=\"" + kPasswordText + "\">" + password +
+         "</wsse:Password></wsse:UsernameToken>";
+}
+
+std::string Timestamp(long created, long expires) {
+  return Period("wsu:Timestamp", created, expires);
+}
+
+std::string Envelope(const std::string& tokens, const std::string& body) {
+  return std::string("<soapenv:Envelope xmlns:soapenv=\"") + kSoap +
+         "\"><soapenv:Header><wsse:Security xmlns:wsse=\"" + kWsse + "\">" + Timestamp() + tokens +
+         "</wsse:Security></soapenv:Header><soapenv:Body xmlns:wst=\"" + kTrust + "\">" + body +
+         "</soapenv:Body></soapenv:Envelope>";
+}
+
 std::string IssueEnvelope(const std::string& user, const std::string& password,
                           const std::string& more) {
-  const std::string trust = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
-  return "<soapenv:Envelope xmlns:soapenv=\"http://schemas.xmlsoap.org/soap/envelope/\">"
-         "<soapenv:Header><wsse:Security xmlns:wsse=\"" +
-         std::string(kWsse) + "\">" + Period("wsu:Timestamp", 600) +
-         "<wsse:UsernameToken xmlns:wsse=\"" + kWsse + "\"><wsse:Username>" + user +
-         "</wsse:Username><wsse:Password Type=\"" + kPasswordText + "\">" + password +
-         "</wsse:Password></wsse:UsernameToken></wsse:Security></soapenv:Header>"
-         "<soapenv:Body xmlns:wst=\"" +
-         trust + "\"><wst:RequestSecurityToken xmlns:wst=\"" + trust +
-         "\" xmlns:wst14=\"http://docs.oasis-open.org/ws-sx/ws-trust/200802\">"
-         "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>"
-         "<wst:RequestType>" +
-         trust + "/Issue</wst:RequestType><wst:KeyType>" + trust + "/Bearer</wst:KeyType>" +
-         Period("wst:Lifetime", 3600) +
-         "<wst:Renewing Allow=\"true\" OK=\"false\"/><wst:Delegatable>true</wst:Delegatable>" +
-         more + "</wst:RequestSecurityToken></soapenv:Body></soapenv:Envelope>";
+  return Envelope(UsernameToken(user, password), IssueBody("Bearer", more));
 }
 
 std::string AliceEnvelope(const std::string& more) {

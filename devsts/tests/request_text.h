@@ -7,6 +7,28 @@ namespace DevSts::Testing {
 
 inline constexpr char kIssueAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
 
+inline constexpr char kRenewAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Renew";
+inline constexpr char kValidateAction[] =
+    "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Validate";
+
+// wst:UseKey as requests for a holder-of-key token carry it.
+inline constexpr char kUseKey[] = "<wst:UseKey Sig=\"holderOfKeyProofSignature\"/>";
+
+// wst:RequestSecurityToken of an Issue request: lifetime an hour, renewable, delegable. `keyType`
+// is "Bearer" or "PublicKey", `more` stands behind wst:Delegatable.
+std::string IssueBody(const std::string& keyType, const std::string& more = "");
+std::string RenewBody(const std::string& assertion, long seconds = 7200);
+std::string ValidateBody(const std::string& assertion);
+
+std::string DelegateTo(const std::string& user);
+std::string ActAs(const std::string& assertion);
+
+std::string UsernameToken(const std::string& user, const std::string& password);
+std::string Timestamp(long created = 0, long expires = 600);
+
+// An unsigned envelope with these tokens behind the Timestamp.
+std::string Envelope(const std::string& tokens, const std::string& body);
+
 // An Issue request for a bearer token that the service accepts: lifetime an hour, renewable,
 // delegable. `more` stands behind wst:Delegatable.
 std::string IssueEnvelope(const std::string& user, const std::string& password,

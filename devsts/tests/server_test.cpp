@@ -8,6 +8,7 @@
 namespace DevSts {
 namespace {
 
+using Testing::ActAs;
 using Testing::AliceEnvelope;
 using testing::AllOf;
 using Testing::AssertionIn;
@@ -123,10 +124,6 @@ TEST(Server, GrantsNoMoreThanWasAskedFor) {
                              "saml2:Advice", "Delegate "}) {
     EXPECT_THAT(assertion, Not(HasSubstr(absent)));
   }
-}
-
-std::string ActAs(const std::string& assertion) {
-  return "<wst14:ActAs>" + assertion + "</wst14:ActAs>";
 }
 
 TEST(Server, ActsAsTheSubjectOfADelegableToken) {
@@ -274,7 +271,7 @@ INSTANTIATE_TEST_SUITE_P(
         RefusedCase{"OtherTokenType", "<wst:TokenType>urn:", "<wst:TokenType>urx:",
                     "wst:InvalidRequest", "Unsupported TokenType: urx:"},
         RefusedCase{"OtherRequestType", "/Issue</wst:RequestType>", "/Renew</wst:RequestType>",
-                    "wst:InvalidRequest", "Unsupported RequestType: "},
+                    "wst:InvalidRequest", "The RequestType does not fit the SOAPAction: "},
         RefusedCase{"UnsignedPublicKey", "/Bearer", "/PublicKey", "wst:InvalidRequest",
                     "PublicKey tokens are not issued to unsigned requests"},
         RefusedCase{"BadBoolean", "Allow=\"true\"", "Allow=\"yes\"", "wst:InvalidRequest",

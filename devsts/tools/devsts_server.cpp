@@ -1,4 +1,5 @@
-// Runs the service until SIGTERM or SIGINT, or the end of standard input if so asked.
+// Runs the service until SIGTERM or SIGINT, or the end of standard input if so asked. Standard
+// input carries commands then.
 #include <poll.h>
 #include <sys/signalfd.h>
 #include <unistd.h>
@@ -10,6 +11,7 @@
 #include <iostream>
 #include <mutex>
 #include <optional>
+#include <string>
 #include <string_view>
 
 #include "devsts/server.h"
@@ -20,7 +22,11 @@ namespace {
 constexpr std::string_view kUsage =
     "usage: devsts_server [--http-port N] [--https-port N] [--address ADDRESS] [--out DIR]\n"
     "                     [--vendor-host HOST] [--solution-host HOST] [--end-with-stdin]\n"
-    "Port 0 takes a free one. DIR receives ca.pem and signing.pem.\n";
+    "Port 0 takes a free one. DIR receives ca.pem and signing.pem, and client.pem and\n"
+    "client-key.pem, by which machine@EXAMPLE.COM may ask for tokens.\n"
+    "With --end-with-stdin, each line of standard input is a command: revoke ID.\n";
+
+constexpr char kClientUser[] = "machine@EXAMPLE.COM";
 
 struct Arguments {
   DevSts::ServerOptions options;
@@ -72,12 +78,17 @@ Arguments Parse(int argc, char** argv) {
   return arguments;
 }
 
+// One line at a time, whichever thread writes it.
+std::mutex outputMutex;
+
 // The request's body is left out: it holds the password.
 void PrintRequest(const DevSts::ReceivedRequest& request) {
-  static std::mutex mutex;
-  const std::lock_guard lock(mutex);
+  const std::lock_guard lock(outputMutex);
+  const auto signature = static_cast<std::size_t>(request.signature);
+  constexpr std::array<const char*, 4> kSignatures{"none", "certificate", "token", "other"};
   std::cout << "request connection=" << request.connectionId << " tls=" << request.overTls
-            << " action=" << request.Header("SOAPAction") << " status=" << request.answeredStatus;
+            << " action=" << request.Header("SOAPAction")
+            << " signature=" << kSignatures.at(signature) << " status=" << request.answeredStatus;
   if (!request.answeredFault.empty()) {
     std::cout << " fault=" << request.answeredFault;
   }
@@ -92,18 +103,59 @@ sigset_t EndSignals() {
   return signals;
 }
 
-void WaitForEnd(int signalDescriptor, bool watchStdin) {
+void Obey(const std::string& command, DevSts::Server& server) {
+  constexpr std::string_view kRevoke = "revoke ";
+  const std::lock_guard lock(outputMutex);
+  if (command.rfind(kRevoke, 0) != 0) {
+    std::cout << "unknown command: " << command << std::endl;
+    return;
+  }
+  const std::string id = command.substr(kRevoke.size());
+  std::cout << (server.Revoke(id) ? "revoked " : "no such token: ") << id << std::endl;
+}
+
+// Takes the complete lines off the text.
+void ObeyLines(std::string& text, DevSts::Server& server) {
+  for (std::size_t end = text.find('\n'); end != std::string::npos; end = text.find('\n')) {
+    Obey(text.substr(0, end), server);
+    text.erase(0, end + 1);
+  }
+}
+
+// False at the end of standard input.
+bool TakeInput(std::string& text, DevSts::Server& server) {
+  std::array<char, 256> octets{};
+  const ssize_t size = read(STDIN_FILENO, octets.data(), octets.size());
+  if (size <= 0) {
+    return false;
+  }
+  text.append(octets.data(), static_cast<std::size_t>(size));
+  ObeyLines(text, server);
+  return true;
+}
+
+void WaitForEnd(int signalDescriptor, bool watchStdin, DevSts::Server& server) {
   std::array<pollfd, 2> entries{
       {{signalDescriptor, POLLIN, 0}, {watchStdin ? STDIN_FILENO : -1, POLLIN, 0}}};
+  std::string input;
   for (;;) {
     if (poll(entries.data(), entries.size(), -1) < 0 || entries[0].revents != 0) {
       return;
     }
-    std::array<char, 256> ignored{};
-    if (entries[1].revents != 0 && read(STDIN_FILENO, ignored.data(), ignored.size()) <= 0) {
+    if (entries[1].revents != 0 && !TakeInput(input, server)) {
       return;
     }
   }
+}
+
+void WriteFiles(const std::string& folder, DevSts::Server& server) {
+  const DevSts::Credential client = server.MakeClientCredential("machine");
+  server.RegisterCertificate(kClientUser, client.certificatePem);
+  std::filesystem::create_directories(folder);
+  DevSts::WriteFile(folder + "/ca.pem", server.CaCertificatePem());
+  DevSts::WriteFile(folder + "/signing.pem", server.SigningCertificatePem());
+  DevSts::WriteFile(folder + "/client.pem", client.certificatePem);
+  DevSts::WriteSecretFile(folder + "/client-key.pem", client.privateKeyPem);
 }
 
 void Run(Arguments arguments) {
@@ -112,14 +164,12 @@ void Run(Arguments arguments) {
   const int signalDescriptor = signalfd(-1, &signals, SFD_CLOEXEC);
 
   arguments.options.onRequest = PrintRequest;
-  const DevSts::Server server(std::move(arguments.options));
+  DevSts::Server server(std::move(arguments.options));
   if (arguments.folder) {
-    std::filesystem::create_directories(*arguments.folder);
-    DevSts::WriteFile(*arguments.folder + "/ca.pem", server.CaCertificatePem());
-    DevSts::WriteFile(*arguments.folder + "/signing.pem", server.SigningCertificatePem());
+    WriteFiles(*arguments.folder, server);
   }
   std::cout << "http_url=" << server.HttpUrl() << "\nhttps_url=" << server.HttpsUrl() << std::endl;
-  WaitForEnd(signalDescriptor, arguments.endWithStdin);
+  WaitForEnd(signalDescriptor, arguments.endWithStdin, server);
   close(signalDescriptor);
 }
 

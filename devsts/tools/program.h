@@ -1,6 +1,10 @@
 #ifndef DEVSTS_PROGRAM_H
 #define DEVSTS_PROGRAM_H
 
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
 #include <fstream>
 #include <sstream>
 #include <stdexcept>
@@ -23,6 +27,20 @@ inline void WriteFile(const std::string& path, const std::string& text) {
   if (!(file << text).flush()) {
     throw std::runtime_error("cannot write " + path);
   }
+}
+
+// The same for what nobody but the owner may read.
+inline void WriteSecretFile(const std::string& path, const std::string& text) {
+  const int file = open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR);
+  // A file that was there keeps its mode, and could be open to others.
+  const bool ours = file >= 0 && fchmod(file, S_IRUSR | S_IWUSR) == 0;
+  if (file >= 0) {
+    close(file);
+  }
+  if (!ours) {
+    throw std::runtime_error("cannot write " + path);
+  }
+  WriteFile(path, text);
 }
 
 }  // namespace DevSts

@@ -56,7 +56,8 @@ struct ReceivedRequest;
 
 /// Shape of the assertions that are issued.
 struct AssertionOptions {
-  /// The exclusive form's prefix list has the prefixes that stand in xsi:type values only.
+  /// The exclusive form's prefix list has the prefixes that stand in xsi:type values only. A token
+  /// signed in inclusive form is found forged when it comes back inside a request.
   SignOptions signing = DefaultSigning();
   /// Key type of the signing certificate; ECDSA algorithms need an EC key.
   KeyType signingKey = KeyType::Rsa2048;
@@ -72,6 +73,10 @@ struct AssertionOptions {
   /// asked for.
   unsigned renewCount = 10;
   unsigned proxyCount = 10;
+  /// Postdatable and RenewExpired of RenewRestrictionType: whether a renewal may begin in the
+  /// future, and whether it may follow the token's end.
+  bool postdatable = false;
+  bool renewExpired = false;
   /// Longest lifetime that is granted.
   std::chrono::seconds maxLifetime{30L * 24 * 3600};
   /// Conditions start this long before now.
@@ -106,10 +111,21 @@ struct ServerOptions {
   std::chrono::seconds clockSkew{60};
   AssertionOptions assertion;
   TlsOptions tls;
+  /// Remembers at most this many issued tokens (the oldest are forgotten first). A forgotten token
+  /// is refused.
+  std::size_t issuedTokenLimit = 8192;
   /// Keeps at most this many requests in the log (the oldest go first).
   std::size_t requestLogLimit = 4096;
   /// Called once per request after its answer is decided, on the connection's thread.
   std::function<void(const ReceivedRequest&)> onRequest;
+};
+
+/// How a request is signed, by the form of what its ds:KeyInfo refers to.
+enum class RequestSignature {
+  None,
+  ByCertificate,  ///< a BinarySecurityToken (X.509 Token Profile 1.1, section 3.2)
+  ByToken,        ///< an assertion's ID (SAML Token Profile 1.1, section 3.4)
+  Other,          ///< nothing that the service knows
 };
 
 /// A request as it was received. Bodies hold passwords: they are for tests to look at, not for
@@ -127,6 +143,9 @@ struct ReceivedRequest {
   std::string target;
   std::vector<std::pair<std::string, std::string>> headers;  ///< in order, names as sent
   std::string body;
+  /// As far as the request was read: None, too, if its envelope or Security header is broken, or
+  /// if a misbehaviour answered it. Whether the signature is right shows in the answer.
+  RequestSignature signature = RequestSignature::None;
   int answeredStatus = 0;     ///< 0 when raw octets were sent
   std::string answeredFault;  ///< faultstring of the fault that was answered, else empty
 
@@ -183,6 +202,14 @@ class Server {
   Credential MakeClientCredential(const std::string& commonName) const;
 
   void SetUsers(Users users);
+  /// Adds a certificate by which this user may ask for tokens. Throws `std::out_of_range` if there
+  /// is no such user, `std::runtime_error` if the certificate does not load.
+  void RegisterCertificate(const std::string& userName, const std::string& certificatePem);
+
+  /// From now on the issued token of this ID is neither valid nor accepted. False: no such token is
+  /// known.
+  bool Revoke(const std::string& assertionId);
+
   void SetAssertionOptions(AssertionOptions options);
 
   /// Applies to every request (and, for the stalls before a request, every connection) from now on.

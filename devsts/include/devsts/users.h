@@ -16,6 +16,9 @@ struct User {
   std::string givenName;
   std::string surname;
   bool isSolution = false;
+  /// PEM, each one certificate by which the user may ask for tokens when it proves that it holds
+  /// the key.
+  std::vector<std::string> certificates = {};
 };
 
 /// Accounts by user principal name, "user@domain", letter case significant.

@@ -1,0 +1,54 @@
+#ifndef DEVSTS_OPERATIONS_H
+#define DEVSTS_OPERATIONS_H
+
+#include <chrono>
+#include <optional>
+#include <string>
+
+#include "accounts.h"
+#include "request_signature.h"
+#include "security_header.h"
+#include "soap_request.h"
+#include "token_issuer.h"
+#include "token_store.h"
+
+namespace DevSts {
+
+// What the operations share.
+struct ServiceParts {
+  const std::chrono::seconds clockSkew;
+  const IssuerIdentity identity;
+  Accounts accounts;
+  TokenStore tokens;
+};
+
+// A request whose envelope, header and signature were found right.
+struct CheckedRequest {
+  SoapRequest soap;
+  SecurityHeader header;
+  std::optional<KeyProof> proof;
+  AssertionOptions shape;
+  Time now;
+};
+
+// Each gives the answer's envelope or throws Fault.
+std::string Issue(const CheckedRequest& request, ServiceParts& parts);
+std::string Renew(const CheckedRequest& request, ServiceParts& parts);
+std::string Validate(const CheckedRequest& request, const ServiceParts& parts);
+
+// An ID for a new assertion.
+std::string MakeId();
+
+// Issues an assertion of this content and remembers it.
+std::string IssueAndRemember(TokenContent content, const CheckedRequest& request,
+                             ServiceParts& parts, TokenAnswer kind);
+
+// The end of a token that begins at `from`.
+Time GrantedEnd(Time from, std::chrono::milliseconds asked, const AssertionOptions& shape);
+
+// WS-Trust 1.3, section 11, InvalidTimeRange.
+void RequireSensibleLifetime(Time created, Time expires);
+
+}  // namespace DevSts
+
+#endif

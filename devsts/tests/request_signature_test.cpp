@@ -1,0 +1,213 @@
+// The signatures of requests as a whole: what they prove, and when.
+#include <gmock/gmock.h>
+
+#include <cstring>
+
+#include "devsts/server.h"
+#include "expect_fault.h"
+#include "raw_client.h"
+#include "signed_request.h"
+
+namespace DevSts {
+namespace {
+
+using Testing::Ask;
+using Testing::AssertionIn;
+using Testing::ByCertificate;
+using Testing::ByToken;
+using Testing::Edits;
+using Testing::Envelope;
+using Testing::ExpectFault;
+using Testing::Holder;
+using Testing::HolderToken;
+using Testing::IssueBody;
+using Testing::kUseKey;
+using Testing::ProofRequest;
+using Testing::Replaced;
+using Testing::Sign;
+using testing::StartsWith;
+using Testing::TimeFromNow;
+using Testing::UsernameToken;
+
+const Credential& Alices() {
+  static const Credential holder = Holder();
+  return holder;
+}
+
+ProofRequest AlicesRequest() {
+  return ByCertificate(Alices(), IssueBody("PublicKey", kUseKey),
+                       UsernameToken("alice@EXAMPLE.COM", "secret"));
+}
+
+TEST(RequestSignature, OfTheCertificateFormIsAccepted) {
+  const Server server;
+  EXPECT_THAT(Ask(server, Sign(AlicesRequest(), Alices())), StartsWith("HTTP/1.1 200"));
+  EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByCertificate);
+}
+
+TEST(RequestSignature, IsSeenOfARefusedRequestToo) {
+  const Server server;
+  Ask(server, Sign(AlicesRequest(), Alices(), {{kUseKey, ""}}));
+  EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByCertificate);
+  Ask(server, Sign(AlicesRequest(), Alices(), {{"<wsse:Reference ", "<wsse:Embedded "}}));
+  EXPECT_EQ(server.LastRequest().signature, RequestSignature::Other);
+  Ask(server, Testing::AliceEnvelope());
+  EXPECT_EQ(server.LastRequest().signature, RequestSignature::None);
+}
+
+struct TamperCase {
+  const char* name;
+  const char* from;
+  const char* to;
+};
+
+class TamperedRequest : public testing::TestWithParam<TamperCase> {};
+
+TEST_P(TamperedRequest, FailsTheCheck) {
+  const Server server;
+  const TamperCase& test = GetParam();
+  const std::string envelope = Replaced(Sign(AlicesRequest(), Alices()), test.from, test.to);
+  ExpectFault(Ask(server, envelope), "wsse:FailedCheck",
+              "The request's signature does not verify: ");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    EveryPart, TamperedRequest,
+    testing::Values(TamperCase{"Body", ">true</wst:Delegatable>", ">false</wst:Delegatable>"},
+                    TamperCase{"BodyBlank", "<wst:TokenType>", " <wst:TokenType>"},
+                    TamperCase{"Timestamp", ".010Z</wsu:Created>", ".010+00:00</wsu:Created>"},
+                    TamperCase{"SignatureValue", "<ds:SignatureValue>", "<ds:SignatureValue>AAAA"}),
+    [](const auto& test) { return test.param.name; });
+
+TEST(RequestSignature, MustBeByTheCertificatesKey) {
+  const Server server;
+  ExpectFault(Ask(server, Sign(AlicesRequest(), Holder("somebody else"))), "wsse:FailedCheck",
+              "The request's signature does not verify: ");
+}
+
+TEST(RequestSignature, MayBeInAnIndentedHeader) {
+  const Server server;
+  const Edits blanks = {{"<wsse:BinarySecurityToken", "\n  <wsse:BinarySecurityToken"},
+                        {"<ds:SignedInfo>", "\n<ds:SignedInfo>\n"}};
+  EXPECT_THAT(Ask(server, Sign(AlicesRequest(), Alices(), blanks)), StartsWith("HTTP/1.1 200"));
+}
+
+TEST(RequestSignature, OfAWeakOrOtherKeyIsRefused) {
+  const Server server;
+  for (const KeyType type : {KeyType::Rsa1024, KeyType::EcP256}) {
+    CertificateSpec spec;
+    spec.commonName = "weak";
+    spec.keyType = type;
+    const Credential weak = MakeCertificate(spec);
+    const ProofRequest request = ByCertificate(weak, IssueBody("PublicKey", kUseKey));
+    ExpectFault(Ask(server, Sign(request, weak)), "wsse:InvalidSecurityToken",
+                "The certificate's key is not an RSA key of 2048 bits or more");
+  }
+}
+
+TEST(RequestSignature, ByACertificateOutOfItsTimeIsRefused) {
+  const Server server;
+  for (const long start : {-7200L, 3600L}) {
+    CertificateSpec spec;
+    spec.commonName = "holder";
+    spec.keyType = KeyType::Rsa2048;
+    spec.notBefore = std::chrono::seconds(start);
+    spec.notAfter = std::chrono::seconds(start + 3600);
+    const Credential holder = MakeCertificate(spec);
+    const ProofRequest request = ByCertificate(holder, IssueBody("PublicKey", kUseKey));
+    ExpectFault(Ask(server, Sign(request, holder)), "wsse:InvalidSecurityToken",
+                "The certificate has expired or is not yet valid");
+  }
+}
+
+struct TimeCase {
+  const char* name;
+  long created;
+  long expires;
+  const char* code;
+  const char* reason;
+};
+
+class SignedTimestamp : public testing::TestWithParam<TimeCase> {};
+
+TEST_P(SignedTimestamp, IsRefused) {
+  const Server server;
+  const TimeCase& test = GetParam();
+  const auto times = [](long created, long expires) {
+    return "<wsu:Created>" + TimeFromNow(created) + "</wsu:Created><wsu:Expires>" +
+           TimeFromNow(expires) + "</wsu:Expires></wsu:Timestamp>";
+  };
+  std::string envelope = Sign(AlicesRequest(), Alices());
+  const std::size_t from = envelope.find("<wsu:Created>");
+  const std::size_t end = envelope.find("</wsu:Timestamp>") + std::strlen("</wsu:Timestamp>");
+  envelope.replace(from, end - from, times(test.created, test.expires));
+  ExpectFault(Ask(server, envelope), test.code, test.reason);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    EveryFault, SignedTimestamp,
+    testing::Values(
+        TimeCase{"InTheFuture", 120, 720, "wsse:InvalidSecurity", "The Timestamp is in the future"},
+        TimeCase{"Expired", -700, -100, "wsu:MessageExpired", "The Timestamp has expired"},
+        TimeCase{"ElevenMinutes", 0, 660, "wsse:InvalidSecurity",
+                 "The signed Timestamp is not valid for ten minutes"},
+        TimeCase{"NineMinutes", 0, 540, "wsse:InvalidSecurity",
+                 "The signed Timestamp is not valid for ten minutes"}),
+    [](const auto& test) { return test.param.name; });
+
+TEST(RequestSignature, IsMissedWhereItsPartsAre) {
+  const Server server;
+  const ProofRequest request = AlicesRequest();
+  ExpectFault(Ask(server, Envelope(request.tokens, request.body)), "wsse:InvalidSecurity",
+              "A token that names a key needs a signature by that key");
+  const std::string wsuId =
+      " xmlns:wsu=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-wssecurity-utility-1.0.xsd\" wsu:Id=\"x\"";
+  ExpectFault(
+      Ask(server, Replaced(Testing::AliceEnvelope(), "<soapenv:Body", "<soapenv:Body" + wsuId)),
+      "wst:InvalidRequest", "Unexpected attribute Id on Body");
+}
+
+// The subject could have anybody's key bound to somebody's token.
+TEST(RequestSignature, IsNeededForAHolderOfKeyTokenByPasswordWithActAs) {
+  const Server server;
+  const std::string user = UsernameToken("bob@EXAMPLE.COM", "bob-secret");
+  const std::string alices = AssertionIn(Ask(server, Testing::AliceEnvelope()));
+  ExpectFault(Ask(server, Envelope(user, IssueBody("PublicKey", Testing::ActAs(alices) + kUseKey))),
+              "wst:InvalidRequest", "PublicKey tokens are not issued to unsigned requests");
+  ExpectFault(Ask(server, Envelope(user, IssueBody("Bearer", kUseKey))), "wst:InvalidRequest",
+              "UseKey names a signature that is not there");
+}
+
+TEST(RequestSignature, OfTheTokenFormIsAccepted) {
+  const Server server;
+  const std::string token = HolderToken(server, Alices());
+  EXPECT_THAT(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), Alices())),
+              StartsWith("HTTP/1.1 200"));
+  EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByToken);
+}
+
+TEST(RequestSignature, OfTheTokenFormMustBeByTheTokensKey) {
+  const Server server;
+  const std::string token = HolderToken(server, Alices());
+  ExpectFault(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), Holder("somebody else"))),
+              "wsse:FailedCheck", "The request's signature does not verify: ");
+}
+
+TEST(RequestSignature, OfTheTokenFormNeedsAHolderOfKeyToken) {
+  const Server server;
+  const std::string bearer = AssertionIn(Ask(server, Testing::AliceEnvelope()));
+  ExpectFault(Ask(server, Sign(ByToken(bearer, IssueBody("PublicKey")), Alices())),
+              "wsse:InvalidSecurityToken", "The presented token is not a holder-of-key token");
+}
+
+TEST(RequestSignature, OfTheCertificateFormHasNoAssertionBeside) {
+  const Server server;
+  const std::string token = HolderToken(server, Alices());
+  const ProofRequest request = ByCertificate(Alices(), IssueBody("PublicKey", kUseKey), token);
+  ExpectFault(Ask(server, Sign(request, Alices())), "wsse:InvalidSecurity",
+              "An assertion is not expected beside a BinarySecurityToken");
+}
+
+}  // namespace
+}  // namespace DevSts

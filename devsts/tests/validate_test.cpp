@@ -1,0 +1,113 @@
+// The verdicts of the Validate binding.
+#include <gmock/gmock.h>
+
+#include "devsts/server.h"
+#include "raw_client.h"
+#include "signed_request.h"
+
+namespace DevSts {
+namespace {
+
+using Testing::Ask;
+using Testing::AssertionIn;
+using Testing::ElementText;
+using Testing::Envelope;
+using Testing::Holder;
+using Testing::HolderToken;
+using Testing::IdOfAssertion;
+using testing::IsEmpty;
+using Testing::kValidateAction;
+using Testing::Replaced;
+using testing::StartsWith;
+using Testing::TimeFromNow;
+using Testing::ValidateBody;
+
+constexpr char kValid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid";
+constexpr char kInvalid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid";
+
+std::string AskAbout(const Server& server, const std::string& token) {
+  return Ask(server, Envelope("", ValidateBody(token)), kValidateAction);
+}
+
+void ExpectInvalid(const std::string& answer, const std::string& reason) {
+  EXPECT_THAT(answer, StartsWith("HTTP/1.1 200 OK\r\n"));
+  EXPECT_EQ(ElementText(answer, "wst:Code"), kInvalid);
+  EXPECT_THAT(ElementText(answer, "wst:Reason"), StartsWith(reason));
+}
+
+TEST(Validate, FindsIssuedTokensValid) {
+  const Server server;
+  for (const std::string& token :
+       {AssertionIn(Ask(server, Testing::AliceEnvelope())), HolderToken(server, Holder())}) {
+    const std::string answer = AskAbout(server, token);
+    EXPECT_THAT(answer, StartsWith("HTTP/1.1 200 OK\r\n"));
+    EXPECT_EQ(ElementText(answer, "wst:TokenType"),
+              "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RSTR/Status");
+    EXPECT_EQ(ElementText(answer, "wst:Code"), kValid);
+    EXPECT_THAT(ElementText(answer, "wst:Reason"), IsEmpty());
+  }
+  EXPECT_EQ(server.GetCounters().tokensIssued, 2U);
+}
+
+TEST(Validate, SaysWhyATokenIsInvalid) {
+  ServerOptions options;
+  options.issuedTokenLimit = 1;
+  Server server(options);
+  const std::string token = AssertionIn(Ask(server, Testing::AliceEnvelope()));
+  ExpectInvalid(AskAbout(server, Replaced(token, "alice@", "carol@")),
+                "The token's signature does not verify: ");
+  ExpectInvalid(AskAbout(server, Testing::WithoutSignature(token)), "The token has no signature");
+  ASSERT_TRUE(server.Revoke(IdOfAssertion(token)));
+  ExpectInvalid(AskAbout(server, token), "The token was revoked");
+  Ask(server, Testing::AliceEnvelope());
+  ExpectInvalid(AskAbout(server, token), "The token is unknown");
+}
+
+TEST(Validate, FindsAnUnreadableTokenInvalid) {
+  const Server server;
+  const std::string bare =
+      "<s:Assertion xmlns:s=\"urn:oasis:names:tc:SAML:2.0:assertion\" ID=\"_1\"/>";
+  ExpectInvalid(AskAbout(server, bare), "The token has no Subject");
+}
+
+TEST(Validate, FindsATokenOutOfItsTimeInvalid) {
+  for (const long start : {-200L, 100L}) {
+    ServerOptions options;
+    options.assertion.beforeSigning = [start](std::string& text) {
+      const std::size_t from = text.find("<saml2:Conditions ");
+      text.replace(from, text.find('>', from) - from,
+                   "<saml2:Conditions NotBefore=\"" + TimeFromNow(start) + "\" NotOnOrAfter=\"" +
+                       TimeFromNow(start + 100) + "\"");
+    };
+    const Server server(options);
+    const std::string token = AssertionIn(Ask(server, Testing::AliceEnvelope()));
+    ExpectInvalid(AskAbout(server, token),
+                  start < 0 ? "The token has expired" : "The token is not yet valid");
+  }
+}
+
+TEST(Validate, RefusesCredentialsAndSignatures) {
+  const Server server;
+  const Credential holder = Holder();
+  const std::string token = HolderToken(server, holder);
+  const std::string user = Testing::UsernameToken("alice@EXAMPLE.COM", "secret");
+  EXPECT_EQ(
+      ElementText(Ask(server, Envelope(user, ValidateBody(token)), kValidateAction), "faultstring"),
+      "A UsernameToken is not expected in a Validate request");
+  const std::string proven =
+      Testing::Sign(Testing::ByCertificate(holder, ValidateBody(token)), holder);
+  EXPECT_EQ(ElementText(Ask(server, proven, kValidateAction), "faultstring"),
+            "A Signature is not expected in a Validate request");
+}
+
+TEST(Validate, RefusesAnythingButAnAssertion) {
+  const Server server;
+  const std::string answer = AskAbout(server, "<x xmlns=\"urn:x\"/>");
+  EXPECT_EQ(ElementText(answer, "faultcode"), "wst:InvalidRequest");
+  EXPECT_EQ(
+      ElementText(answer, "faultstring"),
+      "Expected Assertion (urn:oasis:names:tc:SAML:2.0:assertion) in ValidateTarget, found x");
+}
+
+}  // namespace
+}  // namespace DevSts
