@@ -12,6 +12,8 @@
 namespace Tarnik::Crypto {
 namespace {
 
+constexpr int kMaxFailures = 1000;
+
 using OwnedUiMethod = OpenSsl::Owned<UI_METHOD, UI_destroy_method>;
 
 // Whatever stands behind the scheme may hold a PIN (RFC 7512, section 2.4): messages name the
@@ -24,10 +26,10 @@ std::string SchemeOf(const std::string& uri) {
   return uri.substr(0, colon + 1);
 }
 
-[[noreturn]] void ThrowUnloadable(const std::string& scheme, const Passphrase& passphrase,
-                                  const OpenSsl::ErrorScope& errors) {
+[[noreturn]] void ThrowKeyless(const std::string& scheme, const Passphrase& passphrase,
+                               const OpenSsl::ErrorScope& errors) {
   passphrase.RethrowFailure();
-  const std::string what = "The private key of a URI " + Quote(scheme) + " cannot be loaded";
+  const std::string what = "The URI " + Quote(scheme) + " gives no private key";
   throw CryptoException(
       errors.Describe(passphrase.WasNeeded() ? what + ", or the passphrase is wrong" : what));
 }
@@ -41,19 +43,21 @@ OwnedUiMethod AskFor(const OpenSsl::ErrorScope& errors) {
   return method;
 }
 
-OpenSsl::OwnedKey OnlyKeyOf(OSSL_STORE_CTX* store, const std::string& scheme,
-                            const Passphrase& passphrase, const OpenSsl::ErrorScope& errors) {
+// A store reports errors for what it passes over, also behind the key: only its end counts. A store
+// that does nothing but fail would never come to one.
+OpenSsl::OwnedKey OnlyKeyOf(OSSL_STORE_CTX* store, const std::string& scheme) {
   OpenSsl::OwnedKey found;
-  while (OSSL_STORE_eof(store) != 1) {
+  for (int failures = 0; failures < kMaxFailures && OSSL_STORE_eof(store) != 1;) {
     const OpenSsl::OwnedStoreInfo info(OSSL_STORE_load(store));
-    if (info == nullptr && OSSL_STORE_error(store) == 1) {
-      ThrowUnloadable(scheme, passphrase, errors);
+    if (info == nullptr) {
+      ++failures;
+      continue;
     }
-    if (info == nullptr || OSSL_STORE_INFO_get_type(info.get()) != OSSL_STORE_INFO_PKEY) {
+    if (OSSL_STORE_INFO_get_type(info.get()) != OSSL_STORE_INFO_PKEY) {
       continue;
     }
     if (found != nullptr) {
-      throw CryptoException("The URI " + Quote(scheme) + " names more than one private key.");
+      throw CryptoException("The URI " + Quote(scheme) + " gives more than one private key.");
     }
     found.reset(OSSL_STORE_INFO_get1_PKEY(info.get()));
   }
@@ -70,13 +74,12 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
   const OwnedUiMethod method = AskFor(errors);
   const OpenSsl::OwnedStore store(OSSL_STORE_open_ex(uri.c_str(), nullptr, nullptr, method.get(),
                                                      &asked, nullptr, nullptr, nullptr));
-  if (store == nullptr || OSSL_STORE_expect(store.get(), OSSL_STORE_INFO_PKEY) != 1) {
-    ThrowUnloadable(scheme, asked, errors);
+  OpenSsl::OwnedKey key;
+  if (store != nullptr && OSSL_STORE_expect(store.get(), OSSL_STORE_INFO_PKEY) == 1) {
+    key = OnlyKeyOf(store.get(), scheme);
   }
-  OpenSsl::OwnedKey key = OnlyKeyOf(store.get(), scheme, asked, errors);
   if (key == nullptr) {
-    asked.RethrowFailure();
-    throw CryptoException("The URI " + Quote(scheme) + " names no private key.");
+    ThrowKeyless(scheme, asked, errors);
   }
   return MakeRef<const PrivateKeyImpl>(std::move(key));
 }
