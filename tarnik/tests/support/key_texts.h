@@ -23,9 +23,9 @@ inline std::string ToPkcs8Pem(EVP_PKEY* key, const std::string* passphrase = nul
   const EVP_CIPHER* cipher = passphrase == nullptr ? nullptr : EVP_aes_256_cbc();
   const char* text = passphrase == nullptr ? nullptr : passphrase->data();
   const int length = passphrase == nullptr ? 0 : static_cast<int>(passphrase->size());
-  Require(PEM_write_bio_PKCS8PrivateKey(memory.get(), key, cipher, text, length, nullptr,
-                                        nullptr) == 1,
-          "PKCS#8");
+  Require(
+      PEM_write_bio_PKCS8PrivateKey(memory.get(), key, cipher, text, length, nullptr, nullptr) == 1,
+      "PKCS#8");
   return TextOf(memory.get());
 }
 

@@ -44,7 +44,7 @@ TEST(Base64, EncodesTheVectorsOfRfc4648) {
 }
 
 TEST(Base64, WritesLongTextsInOneLine) {
-  for (const std::size_t size : {48U, 49U, 3U << 20, (3U << 20) + 1, (6U << 20) + 3}) {
+  for (const std::size_t size : {48U, 49U, 3U << 20, (3U << 20) + 1}) {
     std::string bytes(size, '\0');
     for (std::size_t i = 0; i < size; ++i) {
       bytes[i] = static_cast<char>(i * 7);
