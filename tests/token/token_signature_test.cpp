@@ -98,6 +98,12 @@ class FakeSignature final : public Signature, public Tarnik::ObjectImpl {
   const Tarnik::Xml::Security::KeyInfo& KeyInfo() const override { return keyInfo_; }
   Tarnik::Xml::ElementNode* Element() const override { return nullptr; }
   bool Verify(const KeyInfoResolver* resolver) const override { return verify_(resolver); }
+  Ref<Tarnik::Xml::Security::SignatureReference> AddReference(std::string_view,
+                                                              std::string_view) override {
+    return nullptr;
+  }
+  void SetKeyInfo(Tarnik::Xml::ElementNode*) override {}
+  void Sign(const Tarnik::Crypto::PrivateKey*) override {}
 
  private:
   std::function<bool(const KeyInfoResolver*)> verify_;

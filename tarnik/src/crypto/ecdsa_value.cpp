@@ -50,4 +50,21 @@ std::vector<unsigned char> DerFromRawEcdsa(const std::vector<unsigned char>& val
   return Encode(signature.get());
 }
 
+std::vector<unsigned char> RawEcdsaFromDer(const std::vector<unsigned char>& der,
+                                           std::size_t orderLength) {
+  const OpenSsl::ErrorScope errors;
+  const unsigned char* position = der.data();
+  const OpenSsl::OwnedEcdsaSignature signature(
+      d2i_ECDSA_SIG(nullptr, &position, static_cast<long>(der.size())));
+  const int length = static_cast<int>(orderLength);
+  std::vector<unsigned char> value(2 * orderLength);
+  if (signature == nullptr || position != der.data() + der.size() ||
+      BN_bn2binpad(ECDSA_SIG_get0_r(signature.get()), value.data(), length) != length ||
+      BN_bn2binpad(ECDSA_SIG_get0_s(signature.get()), value.data() + orderLength, length) !=
+          length) {
+    throw CryptoException(errors.Describe("The ECDSA signature cannot be decoded"));
+  }
+  return value;
+}
+
 }  // namespace Tarnik::Crypto

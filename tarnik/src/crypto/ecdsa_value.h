@@ -12,6 +12,11 @@ namespace Tarnik::Crypto {
 std::vector<unsigned char> DerFromRawEcdsa(const std::vector<unsigned char>& value,
                                            std::size_t orderLength);
 
+/// The other way. Throws `CryptoException` when `der` is no ECDSA signature, or when a number of it
+/// does not fit.
+std::vector<unsigned char> RawEcdsaFromDer(const std::vector<unsigned char>& der,
+                                           std::size_t orderLength);
+
 }  // namespace Tarnik::Crypto
 
 #endif

@@ -4,10 +4,9 @@
 #include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/public_key.h>
 #include <cstddef>
-#include <mutex>
-#include <vector>
 
 #include "crypto/algorithms.h"
+#include "crypto/key_context_pool.h"
 #include "support/openssl.h"
 
 namespace Tarnik::Crypto {
@@ -39,23 +38,12 @@ class PublicKeyImpl final : public PublicKey, public ObjectImpl {
               const unsigned char* signature, std::size_t signatureLength) const;
 
  private:
-  /// Contexts that were set up for verification and stand idle. Setting one up makes OpenSSL look
-  /// up algorithms by name, so they are kept and used again.
-  struct IdleContexts {
-    std::mutex mutex;
-    std::vector<OpenSsl::OwnedKeyContext> contexts;
-  };
-
-  OpenSsl::OwnedKeyContext TakeContext(SignatureScheme scheme, Hash hash) const;
-  void KeepContext(SignatureScheme scheme, Hash hash, OpenSsl::OwnedKeyContext context) const;
-  IdleContexts& IdleFor(SignatureScheme scheme, Hash hash) const noexcept;
-
   OpenSsl::OwnedKey key_;
   KeyAlgorithm algorithm_;
   int bits_;
   std::size_t valueLength_;
   Curve curve_ = Curve::kNone;
-  mutable IdleContexts idle_[kSignatureSchemeCount * kHashCount];
+  mutable KeyContextPool contexts_{KeyOperation::kVerify};
 };
 
 }  // namespace Tarnik::Crypto

@@ -9,7 +9,7 @@
 #include <tarnik/core/object_impl.h>
 #include <tarnik/http/http_request.h>
 
-#include "http/sensitive_text.h"
+#include "support/sensitive_text.h"
 
 namespace Tarnik::Http {
 

@@ -9,7 +9,7 @@
 
 #include "http/client_response.h"
 #include "http/response_head_check.h"
-#include "http/sensitive_text.h"
+#include "support/sensitive_text.h"
 
 namespace Tarnik::Http {
 

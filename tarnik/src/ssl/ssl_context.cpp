@@ -4,6 +4,7 @@
 
 #include <algorithm>
 
+#include "ssl/client_identity.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_stream.h"
 #include "ssl/tls_engine.h"
@@ -42,6 +43,7 @@ OpenSsl::OwnedSslContext MakeContext(const SSLContextConfig& config) {
   }
   TlsEngine::InstallCallbacks(context.get());
   LoadTrust(config, SSL_CTX_get_cert_store(context.get()));
+  LoadClientIdentity(config, context.get());
   return context;
 }
 

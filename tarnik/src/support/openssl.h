@@ -52,6 +52,8 @@ using OwnedEcdsaSignature = Owned<ECDSA_SIG, ECDSA_SIG_free>;
 using OwnedGeneralNames = std::unique_ptr<GENERAL_NAMES, FreeGeneralNames>;
 using OwnedKey = Owned<EVP_PKEY, EVP_PKEY_free>;
 using OwnedKeyContext = Owned<EVP_PKEY_CTX, EVP_PKEY_CTX_free>;
+/// Its memory is cleansed.
+using OwnedKeyInfo = Owned<PKCS8_PRIV_KEY_INFO, PKCS8_PRIV_KEY_INFO_free>;
 using OwnedPkcs12 = Owned<PKCS12, PKCS12_free>;
 using OwnedSsl = Owned<SSL, SSL_free>;
 using OwnedSslContext = Owned<SSL_CTX, SSL_CTX_free>;

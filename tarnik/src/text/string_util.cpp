@@ -10,19 +10,16 @@
 #include <cstring>
 
 #include <tarnik/core/exception.h>
+#include <tarnik/text/base64.h>
 
 namespace Tarnik::StringUtil {
 namespace {
 
 // OpenSSL counts in int: longer inputs go in pieces that end on a whole group.
-constexpr std::size_t kEncodePiece = std::size_t{3} << 20;
 constexpr std::size_t kDecodePiece = std::size_t{4} << 20;
 constexpr std::string_view kAlphabet =
     "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 
-unsigned char* AsBytes(char* text) {
-  return reinterpret_cast<unsigned char*>(text);
-}
 const unsigned char* AsBytes(const char* text) {
   return reinterpret_cast<const unsigned char*>(text);
 }
@@ -101,16 +98,9 @@ void CheckBase64(const CompactText& compact, std::size_t padding) {
 }  // namespace
 
 std::string Base64Encode(const std::vector<unsigned char>& bytes) {
-  const std::size_t groups = (bytes.size() + 2) / 3;
-  // One more for the NUL that OpenSSL appends.
-  std::string text(groups * 4 + 1, '\0');
+  std::string text(Base64_EncodedLength(bytes.data(), bytes.size()), '\0');
   std::size_t written = 0;
-  for (std::size_t from = 0; from < bytes.size(); from += kEncodePiece) {
-    const std::size_t count = std::min(kEncodePiece, bytes.size() - from);
-    written += static_cast<std::size_t>(EVP_EncodeBlock(
-        AsBytes(text.data() + written), bytes.data() + from, static_cast<int>(count)));
-  }
-  text.resize(written);
+  Base64_Encode(bytes.data(), bytes.size(), text.data(), text.size(), &written);
   return text;
 }
 

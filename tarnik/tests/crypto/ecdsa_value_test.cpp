@@ -3,6 +3,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <tarnik/crypto/crypto_exception.h>
+
 namespace Tarnik::Crypto {
 namespace {
 
@@ -24,6 +26,19 @@ TEST(EcdsaValue, MustBeExactlyTwoOrdersLong) {
 TEST(EcdsaValue, MayNotHoldAZero) {
   EXPECT_THAT(DerFromRawEcdsa({0, 0, 0, 1}, 2), IsEmpty());
   EXPECT_THAT(DerFromRawEcdsa({0, 1, 0, 0}, 2), IsEmpty());
+}
+
+TEST(EcdsaValue, IsReadAsTwoNumbersOfTheLengthOfTheOrder) {
+  EXPECT_THAT(RawEcdsaFromDer({0x30, 8, 0x02, 1, 1, 0x02, 3, 0, 0x80, 0}, 2),
+              ElementsAre(0, 1, 0x80, 0));
+  EXPECT_THAT(RawEcdsaFromDer({0x30, 6, 0x02, 1, 1, 0x02, 1, 2}, 3), ElementsAre(0, 0, 1, 0, 0, 2));
+}
+
+TEST(EcdsaValue, IsRefusedWhenANumberIsTooLongOrTheFormIsBroken) {
+  EXPECT_THROW(RawEcdsaFromDer({0x30, 8, 0x02, 1, 1, 0x02, 3, 0, 0x80, 0}, 1), CryptoException);
+  EXPECT_THROW(RawEcdsaFromDer({0x30, 6, 0x02, 1, 1, 0x02, 1}, 2), CryptoException);
+  EXPECT_THROW(RawEcdsaFromDer({0x30, 6, 0x02, 1, 1, 0x02, 1, 2, 0}, 2), CryptoException);
+  EXPECT_THROW(RawEcdsaFromDer({}, 2), CryptoException);
 }
 
 }  // namespace

@@ -28,6 +28,16 @@ void IgnoreBrokenPipes() {
   pthread_sigmask(SIG_BLOCK, &brokenPipe, nullptr);
 }
 
+std::string ClientCertificateOf(SSL* ssl) {
+  unsigned char* bytes = nullptr;
+  X509* certificate = SSL_get0_peer_certificate(ssl);
+  const int length = certificate == nullptr ? 0 : i2d_X509(certificate, &bytes);
+  const OpenSsl::OwnedMemory<unsigned char> owner(bytes);
+  return length <= 0
+             ? ""
+             : std::string(reinterpret_cast<const char*>(bytes), static_cast<std::size_t>(length));
+}
+
 void Greet(SSL* ssl) {
   TlsWrite(ssl, "hello");
   SSL_shutdown(ssl);
@@ -51,6 +61,11 @@ OpenSsl::OwnedSslContext MakeServerContext(const TlsPeerOptions& options) {
   }
   for (const Identity* issuer : options.chain) {
     isGood = isGood && SSL_CTX_add1_chain_cert(context.get(), issuer->certificate.get()) == 1;
+  }
+  if (options.clientCa != nullptr) {
+    SSL_CTX_set_verify(context.get(), SSL_VERIFY_PEER | SSL_VERIFY_FAIL_IF_NO_PEER_CERT, nullptr);
+    isGood = isGood && X509_STORE_add_cert(SSL_CTX_get_cert_store(context.get()),
+                                           options.clientCa->certificate.get()) == 1;
   }
   if (!isGood) {
     throw std::runtime_error("cannot set up the test's TLS server");
@@ -83,6 +98,7 @@ void TlsServer::Serve(int connections) {
     connection.resumed = SSL_session_reused(ssl.get()) == 1;
     const char* serverName = SSL_get_servername(ssl.get(), TLSEXT_NAMETYPE_host_name);
     connection.serverName = serverName == nullptr ? "" : serverName;
+    connection.clientCertificate = ClientCertificateOf(ssl.get());
     served_.push_back(connection);
     if (connection.accepted) {
       serve_(ssl.get());

@@ -22,6 +22,8 @@ struct TlsPeerOptions {
   int maxVersion = TLS1_3_VERSION;
   std::string ciphers = "DEFAULT";
   int securityLevel = 2;
+  /// If set, the client must present a certificate that this CA stands behind.
+  const Identity* clientCa = nullptr;
 };
 
 OpenSsl::OwnedSslContext MakeServerContext(const TlsPeerOptions& options);
@@ -33,6 +35,8 @@ class TlsServer {
     bool accepted = false;
     bool resumed = false;
     std::string serverName;
+    /// DER of the client's certificate; empty for none.
+    std::string clientCertificate;
   };
   using Handler = std::function<void(SSL*)>;
 

@@ -7,6 +7,7 @@
 
 #include <tarnik/core/ref.h>
 #include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/private_key.h>
 #include <tarnik/system/stream.h>
 
 namespace Tarnik::Ssl {
@@ -34,7 +35,7 @@ class TARNIK_EXPORT SSLContext : public virtual Object {
   virtual Ref<SSLStream> WrapStream(System::Stream* stream, const std::string& name) = 0;
 };
 
-/// Whom to trust. With nothing set, no peer is trusted.
+/// Whom to trust, and who to be. With nothing set, no peer is trusted and no certificate is shown.
 struct SSLContextConfig {
   /// Files of PEM CA certificates.
   std::vector<std::string> caFiles;
@@ -49,9 +50,17 @@ struct SSLContextConfig {
   std::vector<std::string> crlFiles;
   /// If not empty, the peer's own certificate must also equal one of these byte for byte.
   std::vector<Ref<const Crypto::Certificate>> pinnedCertificates;
+  /// Shown to a peer that asks for a certificate, with proof that `clientPrivateKey` is at hand.
+  /// Both are set or neither.
+  Ref<const Crypto::Certificate> clientCertificate;
+  Ref<const Crypto::PrivateKey> clientPrivateKey;
+  /// Sent behind `clientCertificate`: its issuers, each behind the one that it has issued.
+  std::vector<Ref<const Crypto::Certificate>> clientCertificateChain;
 };
 
-/// Throws `SSLException`, naming the file, when something that `config` names cannot be loaded.
+/// Throws `SSLException` when something that `config` names cannot be loaded (naming the file), and
+/// when the client's key does not belong to its certificate, one of them is set without the other,
+/// or TLS cannot use them; `InvalidArgumentException` when a certificate of a list is null.
 TARNIK_EXPORT Ref<SSLContext> CreateSSLContext(const SSLContextConfig& config);
 
 }  // namespace Tarnik::Ssl

@@ -34,13 +34,6 @@ bool IsPlainId(std::string_view text) noexcept {
          std::all_of(text.begin(), text.end(), IsIdCharacter);
 }
 
-const Node* RootOf(const Node* node) noexcept {
-  while (node->Parent() != nullptr) {
-    node = node->Parent();
-  }
-  return node;
-}
-
 const Node* FirstChildOf(const Node* node) noexcept {
   if (node->Kind() != NodeKind::kElement && node->Kind() != NodeKind::kDocument) {
     return nullptr;
@@ -100,6 +93,14 @@ void NoteIds(const ElementNode* element, std::vector<Search>& searches) {
   }
 }
 
+void NoteAllIds(const Node* root, std::vector<Search>& searches) {
+  for (const Node* node = root; node != nullptr; node = NextInDocument(node)) {
+    if (node->Kind() == NodeKind::kElement) {
+      NoteIds(static_cast<const ElementNode*>(node), searches);
+    }
+  }
+}
+
 std::vector<Search> SearchesFor(const std::vector<Reference>& references) {
   std::vector<Search> searches;
   for (const Reference& reference : references) {
@@ -126,6 +127,13 @@ const ElementNode* CarrierOf(const Search& search) {
 
 }  // namespace
 
+const Node* RootOf(const Node* node) noexcept {
+  while (node->Parent() != nullptr) {
+    node = node->Parent();
+  }
+  return node;
+}
+
 bool IsWithin(const Node* inner, const Node* outer) noexcept {
   while (inner != nullptr && inner != outer) {
     inner = inner->Parent();
@@ -133,15 +141,13 @@ bool IsWithin(const Node* inner, const Node* outer) noexcept {
   return inner != nullptr;
 }
 
-std::vector<const Node*> FindReferenceTargets(const ElementNode* signature,
+std::vector<const Node*> FindReferenceTargets(const Node* root, const ElementNode* signature,
                                               const std::vector<Reference>& references) {
   std::vector<Search> searches = SearchesFor(references);
-  const Node* root = RootOf(signature);
   if (!searches.empty()) {
-    for (const Node* node = root; node != nullptr; node = NextInDocument(node)) {
-      if (node->Kind() == NodeKind::kElement) {
-        NoteIds(static_cast<const ElementNode*>(node), searches);
-      }
+    NoteAllIds(root, searches);
+    if (!IsWithin(signature, root)) {
+      NoteAllIds(RootOf(signature), searches);
     }
   }
   std::vector<const Node*> targets;

@@ -4,51 +4,22 @@
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 #include <algorithm>
+#include <utility>
 
 #include "crypto/ecdsa_value.h"
 #include "crypto/public_key_impl.h"
 #include "xml/security/digest_writer.h"
+#include "xml/security/key_check.h"
+#include "xml/security/new_signature.h"
+#include "xml/security/reference_targets.h"
 #include "xml/security/signature_impl.h"
-#include "xml/security/verification_plan.h"
+#include "xml/security/signature_plan.h"
 
 namespace Tarnik::Xml::Security {
 namespace {
 
-using Crypto::Curve;
-using Crypto::KeyAlgorithm;
 using Crypto::PublicKeyImpl;
 using Crypto::SignatureScheme;
-
-// NIST SP 800-131A: shorter RSA keys are disallowed.
-constexpr int kMinRsaBits = 2048;
-
-bool FitsScheme(const PublicKeyImpl& key, SignatureScheme scheme) {
-  switch (scheme) {
-    case SignatureScheme::kRsaPkcs1:
-      return key.Algorithm() == KeyAlgorithm::kRsa;
-    case SignatureScheme::kRsaPss:
-      return key.Algorithm() == KeyAlgorithm::kRsa || key.Algorithm() == KeyAlgorithm::kRsaPss;
-    case SignatureScheme::kEcdsa:
-      break;
-  }
-  return key.Algorithm() == KeyAlgorithm::kEc;
-}
-
-void CheckKey(const PublicKeyImpl& key, SignatureScheme scheme) {
-  if (!FitsScheme(key, scheme)) {
-    throw XmlSecurityException("The trusted key is not of the type of the signature algorithm.");
-  }
-  if (scheme == SignatureScheme::kEcdsa) {
-    if (key.NamedCurve() == Curve::kNone) {
-      throw XmlSecurityException("The trusted key is not on the curve P-256, P-384 or P-521.");
-    }
-    return;
-  }
-  if (key.Bits() < kMinRsaBits) {
-    throw XmlSecurityException("The trusted RSA key has " + std::to_string(key.Bits()) +
-                               " bits; at least " + std::to_string(kMinRsaBits) + " are needed.");
-  }
-}
 
 Ref<const Crypto::PublicKey> ResolveKey(const KeyInfoResolver& resolver, const KeyInfo& keyInfo) {
   Ref<const Crypto::PublicKey> key = resolver.Resolve(keyInfo);
@@ -66,14 +37,8 @@ const PublicKeyImpl& ImplementationOf(const Crypto::PublicKey& key) {
   return *implementation;
 }
 
-Digest Compute(const DigestInput& input, DigestWriter& writer) {
-  writer.Start(input.hash);
-  WriteCanonical(input.apex, input.omitted, input.canonicalization, writer);
-  return writer.Finish();
-}
-
 bool IsSignatureOf(const Digest& digest, const std::vector<unsigned char>& value,
-                   const PublicKeyImpl& key, const VerificationPlan& plan) {
+                   const PublicKeyImpl& key, const SignaturePlan& plan) {
   if (plan.scheme == SignatureScheme::kEcdsa) {
     const std::vector<unsigned char> der = Crypto::DerFromRawEcdsa(value, key.OrderLength());
     return !der.empty() && key.Verify(plan.scheme, plan.signedInfo.hash, digest.bytes.data(),
@@ -92,35 +57,51 @@ bool Equal(const Digest& digest, const std::vector<unsigned char>& value) {
 
 // The signature over SignedInfo comes first: what the references ask for is done only for the owner
 // of the key.
-bool Carries(const SignatureContent& content, const VerificationPlan& plan,
-             const PublicKeyImpl& key) {
+bool Carries(const SignatureContent& content, const SignaturePlan& plan, const PublicKeyImpl& key) {
   DigestWriter writer;
-  if (!IsSignatureOf(Compute(plan.signedInfo, writer), content.signatureValue, key, plan)) {
+  if (!IsSignatureOf(ComputeDigest(plan.signedInfo, writer), content.signatureValue, key, plan)) {
     return false;
   }
   for (std::size_t i = 0; i < plan.references.size(); ++i) {
-    if (!Equal(Compute(plan.references[i], writer), content.references[i].digestValue)) {
+    if (!Equal(ComputeDigest(plan.references[i], writer), content.references[i].digestValue)) {
       return false;
     }
   }
   return true;
 }
 
+[[noreturn]] void RefuseChange() {
+  throw InvalidStateException("A signature that was read from a document cannot be changed.");
+}
+
 }  // namespace
 
-SignatureImpl::SignatureImpl(ElementNode* element)
-    : element_(element), content_(ReadSignature(element)) {}
+SignatureImpl::SignatureImpl(ElementNode* element, SignatureContent content)
+    : element_(element), content_(std::move(content)) {}
 
 SignatureImpl::~SignatureImpl() = default;
+
+Ref<SignatureReference> SignatureImpl::AddReference(std::string_view /*uri*/,
+                                                    std::string_view /*digestMethod*/) {
+  RefuseChange();
+}
+
+void SignatureImpl::SetKeyInfo(ElementNode* /*content*/) {
+  RefuseChange();
+}
+
+void SignatureImpl::Sign(const Crypto::PrivateKey* /*key*/) {
+  RefuseChange();
+}
 
 bool SignatureImpl::Verify(const KeyInfoResolver* resolver) const {
   if (resolver == nullptr) {
     throw XmlSecurityException("A signature cannot be verified without a key resolver.");
   }
-  const VerificationPlan plan = PlanVerification(element_.get(), content_);
+  const SignaturePlan plan = PlanSignature(RootOf(element_.get()), element_.get(), content_);
   const Ref<const Crypto::PublicKey> key = ResolveKey(*resolver, content_.keyInfo);
   const PublicKeyImpl& implementation = ImplementationOf(*key);
-  CheckKey(implementation, plan.scheme);
+  CheckTrustedKey(implementation, plan.scheme);
   try {
     return Carries(content_, plan, implementation);
   } catch (const Crypto::CryptoException& error) {
@@ -132,7 +113,16 @@ Ref<Signature> CreateSignatureFromDom(ElementNode* element) {
   if (element == nullptr) {
     throw InvalidArgumentException("A signature cannot be read from a null element.");
   }
-  return MakeRef<SignatureImpl>(element);
+  return MakeRef<SignatureImpl>(element, ReadSignature(element));
+}
+
+void CreateBlankSignature(ElementNode* root, const std::string& c14nMethod,
+                          const std::string& signatureMethod, const std::string& prefix,
+                          Ref<Signature>& signature) {
+  if (root == nullptr) {
+    throw InvalidArgumentException("A signature cannot be made for a null element.");
+  }
+  signature = MakeRef<NewSignature>(root, c14nMethod, signatureMethod, prefix);
 }
 
 }  // namespace Tarnik::Xml::Security

@@ -8,10 +8,10 @@
 
 namespace Tarnik::Xml::Security {
 
-/// A signature that was read from a document.
+/// A signature with values: read from a document, or made and signed.
 class SignatureImpl final : public Signature, public ObjectImpl {
  public:
-  explicit SignatureImpl(ElementNode* element);
+  SignatureImpl(ElementNode* element, SignatureContent content);
   ~SignatureImpl() override;
 
   const std::string& CanonicalizationMethod() const override {
@@ -22,6 +22,11 @@ class SignatureImpl final : public Signature, public ObjectImpl {
   const Security::KeyInfo& KeyInfo() const override { return content_.keyInfo; }
   ElementNode* Element() const override { return element_.get(); }
   bool Verify(const KeyInfoResolver* resolver) const override;
+  /// These throw `InvalidStateException`.
+  Ref<SignatureReference> AddReference(std::string_view uri,
+                                       std::string_view digestMethod) override;
+  void SetKeyInfo(ElementNode* content) override;
+  void Sign(const Crypto::PrivateKey* key) override;
 
  private:
   Ref<ElementNode> element_;

@@ -1,4 +1,4 @@
-#include "xml/security/verification_plan.h"
+#include "xml/security/signature_plan.h"
 
 #include <tarnik/xml/security/xml_security_exception.h>
 #include <utility>
@@ -52,10 +52,11 @@ void CheckTarget(const DigestInput& input, const Reference& reference,
 
 }  // namespace
 
-VerificationPlan PlanVerification(const ElementNode* signature, const SignatureContent& content) {
+SignaturePlan PlanSignature(const Node* root, const ElementNode* signature,
+                            const SignatureContent& content) {
   const SignatureMethod method =
       RequireSignatureMethod(content.signatureMethod, content.signatureMethodElement);
-  VerificationPlan plan;
+  SignaturePlan plan;
   plan.scheme = method.scheme;
   plan.signedInfo = PlanSignedInfo(content, method.hash);
   plan.references.reserve(content.references.size());
@@ -63,12 +64,19 @@ VerificationPlan PlanVerification(const ElementNode* signature, const SignatureC
     plan.references.push_back(
         PlanTransforms(content.references[i], content.referenceElements[i], signature));
   }
-  const std::vector<const Node*> targets = FindReferenceTargets(signature, content.references);
+  const std::vector<const Node*> targets =
+      FindReferenceTargets(root, signature, content.references);
   for (std::size_t i = 0; i < targets.size(); ++i) {
     plan.references[i].apex = targets[i];
     CheckTarget(plan.references[i], content.references[i], signature);
   }
   return plan;
+}
+
+Digest ComputeDigest(const DigestInput& input, DigestWriter& writer) {
+  writer.Start(input.hash);
+  WriteCanonical(input.apex, input.omitted, input.canonicalization, writer);
+  return writer.Finish();
 }
 
 }  // namespace Tarnik::Xml::Security

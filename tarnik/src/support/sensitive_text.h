@@ -1,5 +1,5 @@
-#ifndef TARNIK_HTTP_SENSITIVE_TEXT_H
-#define TARNIK_HTTP_SENSITIVE_TEXT_H
+#ifndef TARNIK_SUPPORT_SENSITIVE_TEXT_H
+#define TARNIK_SUPPORT_SENSITIVE_TEXT_H
 
 #include <algorithm>
 #include <string>
@@ -7,9 +7,9 @@
 
 #include <tarnik/text/string_util.h>
 
-namespace Tarnik::Http {
+namespace Tarnik {
 
-/// Bytes that may hold passwords or tokens: no copy is left behind in memory, neither when the text
+/// Bytes that may hold passwords, keys or tokens: no copy is left behind in memory, neither when the text
 /// dies nor when it outgrows its buffer.
 class SensitiveText {
  public:
@@ -66,6 +66,6 @@ class SensitiveText {
   std::string text_;
 };
 
-}  // namespace Tarnik::Http
+}  // namespace Tarnik
 
 #endif

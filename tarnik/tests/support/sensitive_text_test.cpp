@@ -1,6 +1,6 @@
-#include "http/sensitive_text.h"
+#include "support/sensitive_text.h"
 
-namespace Tarnik::Http {
+namespace Tarnik {
 namespace {
 
 TEST(SensitiveText, KeepsItsBytesWhenItGrows) {
@@ -46,4 +46,4 @@ TEST(SensitiveText, HandsItsBytesOverAndIsEmpty) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik

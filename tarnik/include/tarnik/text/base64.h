@@ -1,0 +1,25 @@
+#ifndef TARNIK_TEXT_BASE64_H
+#define TARNIK_TEXT_BASE64_H
+
+#include <cstddef>
+
+#include <tarnik/export.h>
+
+namespace Tarnik {
+
+/// Length in characters of the Base64 text of `length` bytes at `data`: four for each group of
+/// three or fewer, with neither line breaks nor a terminating NUL. Throws
+/// `InvalidArgumentException` when `data` is null and `length` is not 0, and when the text would be
+/// longer than memory.
+TARNIK_EXPORT std::size_t Base64_EncodedLength(const unsigned char* data, std::size_t length);
+
+/// Writes the standard, padded Base64 text (RFC 4648, section 4) of `length` bytes at `data` to
+/// `buffer`, in one line and without a terminating NUL, and sets `written` to its length, which is
+/// that of `Base64_EncodedLength`. Throws `InvalidArgumentException` as that function does, when
+/// `written` is null, and when `bufferSize` characters are too few; nothing is written then.
+TARNIK_EXPORT void Base64_Encode(const unsigned char* data, std::size_t length, char* buffer,
+                                 std::size_t bufferSize, std::size_t* written);
+
+}  // namespace Tarnik
+
+#endif

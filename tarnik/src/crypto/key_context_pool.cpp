@@ -1,0 +1,81 @@
+#include "crypto/key_context_pool.h"
+
+#include <openssl/rsa.h>
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <utility>
+
+#include "support/openssl_error.h"
+
+namespace Tarnik::Crypto {
+namespace {
+
+// More threads than this may use one key at once; they then set up contexts of their own.
+constexpr std::size_t kMaxIdleContexts = 64;
+
+bool Begin(EVP_PKEY_CTX* context, KeyOperation operation) {
+  return operation == KeyOperation::kSign ? EVP_PKEY_sign_init(context) == 1
+                                          : EVP_PKEY_verify_init(context) == 1;
+}
+
+bool SetUp(EVP_PKEY_CTX* context, SignatureScheme scheme, Hash hash) {
+  const EVP_MD* algorithm = FetchedHash(hash);
+  switch (scheme) {
+    case SignatureScheme::kRsaPkcs1:
+      return EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PADDING) == 1 &&
+             EVP_PKEY_CTX_set_signature_md(context, algorithm) == 1;
+    case SignatureScheme::kRsaPss:
+      return EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PSS_PADDING) == 1 &&
+             EVP_PKEY_CTX_set_signature_md(context, algorithm) == 1 &&
+             EVP_PKEY_CTX_set_rsa_mgf1_md(context, algorithm) == 1 &&
+             EVP_PKEY_CTX_set_rsa_pss_saltlen(context, RSA_PSS_SALTLEN_DIGEST) == 1;
+    case SignatureScheme::kEcdsa:
+      break;
+  }
+  return EVP_PKEY_CTX_set_signature_md(context, algorithm) == 1;
+}
+
+const char* FailureOf(KeyOperation operation) noexcept {
+  return operation == KeyOperation::kSign ? "The key cannot make signatures of this kind"
+                                          : "The key cannot verify signatures of this kind";
+}
+
+}  // namespace
+
+OpenSsl::OwnedKeyContext KeyContextPool::Take(EVP_PKEY* key, SignatureScheme scheme, Hash hash) {
+  if (OpenSsl::OwnedKeyContext idle = TakeIdle(scheme, hash)) {
+    return idle;
+  }
+  const OpenSsl::ErrorScope errors;
+  OpenSsl::OwnedKeyContext context(EVP_PKEY_CTX_new_from_pkey(nullptr, key, nullptr));
+  if (context == nullptr || !Begin(context.get(), operation_) ||
+      !SetUp(context.get(), scheme, hash)) {
+    throw CryptoException(errors.Describe(FailureOf(operation_)));
+  }
+  return context;
+}
+
+void KeyContextPool::Keep(SignatureScheme scheme, Hash hash, OpenSsl::OwnedKeyContext context) {
+  IdleContexts& idle = IdleFor(scheme, hash);
+  const std::lock_guard lock(idle.mutex);
+  if (idle.contexts.size() < kMaxIdleContexts) {
+    idle.contexts.push_back(std::move(context));
+  }
+}
+
+OpenSsl::OwnedKeyContext KeyContextPool::TakeIdle(SignatureScheme scheme, Hash hash) {
+  IdleContexts& idle = IdleFor(scheme, hash);
+  const std::lock_guard lock(idle.mutex);
+  if (idle.contexts.empty()) {
+    return nullptr;
+  }
+  OpenSsl::OwnedKeyContext context = std::move(idle.contexts.back());
+  idle.contexts.pop_back();
+  return context;
+}
+
+KeyContextPool::IdleContexts& KeyContextPool::IdleFor(SignatureScheme scheme, Hash hash) noexcept {
+  return idle_[static_cast<std::size_t>(scheme) * kHashCount + static_cast<std::size_t>(hash)];
+}
+
+}  // namespace Tarnik::Crypto

@@ -1,0 +1,87 @@
+#include <openssl/err.h>
+#include <openssl/ui.h>
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/crypto/private_key.h>
+
+#include "crypto/passphrase.h"
+#include "crypto/private_key_impl.h"
+#include "support/openssl_error.h"
+#include "support/quote.h"
+
+namespace Tarnik::Crypto {
+namespace {
+
+constexpr int kMaxFailures = 1000;
+
+using OwnedUiMethod = OpenSsl::Owned<UI_METHOD, UI_destroy_method>;
+
+// Whatever stands behind the scheme may hold a PIN (RFC 7512, section 2.4): messages name the
+// scheme alone.
+std::string SchemeOf(const std::string& uri) {
+  const std::size_t colon = uri.find(':');
+  if (colon == 0 || colon == std::string::npos || uri.find('\0') != std::string::npos) {
+    throw CryptoException("The URI of the private key has no scheme or holds a NUL.");
+  }
+  return uri.substr(0, colon + 1);
+}
+
+[[noreturn]] void ThrowKeyless(const std::string& scheme, const Passphrase& passphrase,
+                               const OpenSsl::ErrorScope& errors) {
+  passphrase.RethrowFailure();
+  const std::string what = "The URI " + Quote(scheme) + " gives no private key";
+  throw CryptoException(
+      errors.Describe(passphrase.WasNeeded() ? what + ", or the passphrase is wrong" : what));
+}
+
+// A method of the caller's passphrase alone: OpenSSL's own would ask on the terminal.
+OwnedUiMethod AskFor(const OpenSsl::ErrorScope& errors) {
+  OwnedUiMethod method(UI_UTIL_wrap_read_pem_callback(Passphrase::Read, 0));
+  if (method == nullptr) {
+    throw CryptoException(errors.Describe("The passphrase cannot be asked for"));
+  }
+  return method;
+}
+
+// A store reports errors for what it passes over, also behind the key: only its end counts. A store
+// that does nothing but fail would never come to one.
+OpenSsl::OwnedKey OnlyKeyOf(OSSL_STORE_CTX* store, const std::string& scheme) {
+  OpenSsl::OwnedKey found;
+  for (int failures = 0; failures < kMaxFailures && OSSL_STORE_eof(store) != 1;) {
+    const OpenSsl::OwnedStoreInfo info(OSSL_STORE_load(store));
+    if (info == nullptr) {
+      ++failures;
+      continue;
+    }
+    if (OSSL_STORE_INFO_get_type(info.get()) != OSSL_STORE_INFO_PKEY) {
+      continue;
+    }
+    if (found != nullptr) {
+      throw CryptoException("The URI " + Quote(scheme) + " gives more than one private key.");
+    }
+    found.reset(OSSL_STORE_INFO_get1_PKEY(info.get()));
+  }
+  return found;
+}
+
+}  // namespace
+
+Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
+                                            const PassphraseCallback& passphrase) {
+  const std::string scheme = SchemeOf(uri);
+  const OpenSsl::ErrorScope errors;
+  Passphrase asked(passphrase);
+  const OwnedUiMethod method = AskFor(errors);
+  const OpenSsl::OwnedStore store(OSSL_STORE_open_ex(uri.c_str(), nullptr, nullptr, method.get(),
+                                                     &asked, nullptr, nullptr, nullptr));
+  OpenSsl::OwnedKey key;
+  if (store != nullptr && OSSL_STORE_expect(store.get(), OSSL_STORE_INFO_PKEY) == 1) {
+    key = OnlyKeyOf(store.get(), scheme);
+  }
+  if (key == nullptr) {
+    ThrowKeyless(scheme, asked, errors);
+  }
+  return MakeRef<const PrivateKeyImpl>(std::move(key));
+}
+
+}  // namespace Tarnik::Crypto

@@ -1,0 +1,72 @@
+#include "crypto/passphrase.h"
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/text/string_util.h>
+#include <algorithm>
+#include <cstddef>
+
+namespace Tarnik::Crypto {
+namespace {
+
+// PEM_BUFSIZE of OpenSSL: what its callbacks have room for.
+constexpr std::size_t kMaxPassphraseBytes = 1024;
+
+}  // namespace
+
+Passphrase::~Passphrase() {
+  StringUtil::Cleanse(text_);
+}
+
+const std::string& Passphrase::Get() {
+  wasNeeded_ = true;
+  if (failure_ != nullptr) {
+    std::rethrow_exception(failure_);
+  }
+  if (!isKnown_) {
+    try {
+      Ask();
+    } catch (...) {
+      // It is not asked a second time.
+      failure_ = std::current_exception();
+      throw;
+    }
+  }
+  return text_;
+}
+
+void Passphrase::Ask() {
+  if (!callback_) {
+    throw CryptoException("The private key is encrypted, and no passphrase was given.");
+  }
+  // Short texts lie in the string itself, where a move would leave them.
+  std::string given = callback_();
+  text_.reserve(given.size());
+  text_ = given;
+  StringUtil::Cleanse(given);
+  if (text_.size() > kMaxPassphraseBytes) {
+    throw CryptoException("The passphrase is longer than " + std::to_string(kMaxPassphraseBytes) +
+                          " bytes.");
+  }
+  isKnown_ = true;
+}
+
+int Passphrase::Read(char* buffer, int size, int /*forWriting*/, void* passphrase) noexcept {
+  try {
+    const std::string& text = static_cast<Passphrase*>(passphrase)->Get();
+    if (size < 0 || text.size() > static_cast<std::size_t>(size)) {
+      return -1;
+    }
+    std::copy(text.begin(), text.end(), buffer);
+    return static_cast<int>(text.size());
+  } catch (...) {
+    return -1;
+  }
+}
+
+void Passphrase::RethrowFailure() const {
+  if (failure_ != nullptr) {
+    std::rethrow_exception(failure_);
+  }
+}
+
+}  // namespace Tarnik::Crypto

@@ -1,0 +1,55 @@
+#ifndef TARNIK_CRYPTO_PEM_H
+#define TARNIK_CRYPTO_PEM_H
+
+#include <cstddef>
+#include <string_view>
+
+#include "support/openssl.h"
+#include "support/openssl_error.h"
+
+namespace Tarnik::Crypto {
+
+/// One block of a PEM text (RFC 7468), or none. What it holds may be a private key and is cleansed.
+class PemBlock {
+ public:
+  PemBlock() = default;
+  PemBlock(PemBlock&& other) noexcept;
+  PemBlock(const PemBlock&) = delete;
+  PemBlock& operator=(const PemBlock&) = delete;
+  ~PemBlock();
+
+  std::string_view Label() const noexcept { return label_; }
+  /// The header lines of RFC 1421 that traditional formats have; empty for none.
+  char* Header() const noexcept { return header_; }
+  unsigned char* Bytes() const noexcept { return bytes_; }
+  /// Decryption in place shortens it.
+  long& Length() noexcept { return length_; }
+  std::size_t Size() const noexcept { return static_cast<std::size_t>(length_); }
+
+ private:
+  friend class PemReader;
+
+  char* label_ = nullptr;
+  char* header_ = nullptr;
+  unsigned char* bytes_ = nullptr;
+  long length_ = 0;
+  std::size_t capacity_ = 0;
+};
+
+/// Reads the blocks of a PEM text in order.
+class PemReader {
+ public:
+  /// `pem` must outlive the reader. Throws `CryptoException` when it is too long for OpenSSL.
+  explicit PemReader(std::string_view pem);
+
+  /// Reads the next block into `block`, which must be empty; false at the end of the text. Throws
+  /// `CryptoException` when a block is broken.
+  bool Next(PemBlock& block);
+
+ private:
+  OpenSsl::OwnedBio source_;
+};
+
+}  // namespace Tarnik::Crypto
+
+#endif

@@ -1,0 +1,156 @@
+#include <tarnik/crypto/private_key.h>
+
+#include <openssl/pem.h>
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <optional>
+#include <utility>
+
+#include "crypto/passphrase.h"
+#include "crypto/pem.h"
+#include "crypto/private_key_impl.h"
+#include "support/file.h"
+#include "support/openssl_error.h"
+#include "support/quote.h"
+#include "support/sensitive_text.h"
+
+namespace Tarnik::Crypto {
+namespace {
+
+constexpr std::string_view kPrivateKeyLabel = "PRIVATE KEY";
+constexpr const char* kUndecryptable =
+    "The private key cannot be decrypted: the passphrase is wrong, or the key is broken";
+constexpr const char* kUndecodable = "The private key cannot be decoded";
+
+bool IsPrivateKeyLabel(std::string_view label) noexcept {
+  return label.size() >= kPrivateKeyLabel.size() &&
+         label.substr(label.size() - kPrivateKeyLabel.size()) == kPrivateKeyLabel;
+}
+
+PemBlock OnlyKeyBlock(std::string_view pem) {
+  PemReader reader(pem);
+  std::optional<PemBlock> found;
+  for (;;) {
+    PemBlock block;
+    if (!reader.Next(block)) {
+      break;
+    }
+    if (!IsPrivateKeyLabel(block.Label())) {
+      continue;
+    }
+    if (found) {
+      throw CryptoException("The PEM text holds more than one private key.");
+    }
+    found.emplace(std::move(block));
+  }
+  if (!found) {
+    throw CryptoException("The PEM text holds no private key.");
+  }
+  return std::move(*found);
+}
+
+OpenSsl::OwnedKey KeyFromInfo(const PKCS8_PRIV_KEY_INFO* info, const OpenSsl::ErrorScope& errors) {
+  OpenSsl::OwnedKey key(EVP_PKCS82PKEY(info));
+  if (key == nullptr) {
+    throw CryptoException(errors.Describe(kUndecodable));
+  }
+  return key;
+}
+
+OpenSsl::OwnedKey DecodePkcs8(const PemBlock& block) {
+  const OpenSsl::ErrorScope errors;
+  const unsigned char* position = block.Bytes();
+  const OpenSsl::OwnedKeyInfo info(
+      d2i_PKCS8_PRIV_KEY_INFO(nullptr, &position, static_cast<long>(block.Size())));
+  if (info == nullptr) {
+    throw CryptoException(errors.Describe(kUndecodable));
+  }
+  return KeyFromInfo(info.get(), errors);
+}
+
+OpenSsl::OwnedKey DecodeEncryptedPkcs8(const PemBlock& block, Passphrase& passphrase) {
+  const OpenSsl::ErrorScope errors;
+  const unsigned char* position = block.Bytes();
+  const OpenSsl::Owned<X509_SIG, X509_SIG_free> encrypted(
+      d2i_X509_SIG(nullptr, &position, static_cast<long>(block.Size())));
+  if (encrypted == nullptr) {
+    throw CryptoException(errors.Describe(kUndecodable));
+  }
+  const std::string& text = passphrase.Get();
+  const OpenSsl::OwnedKeyInfo info(
+      PKCS8_decrypt(encrypted.get(), text.data(), static_cast<int>(text.size())));
+  if (info == nullptr) {
+    throw CryptoException(errors.Describe(kUndecryptable));
+  }
+  return KeyFromInfo(info.get(), errors);
+}
+
+int TraditionalTypeOf(std::string_view label) {
+  if (label == PEM_STRING_RSA) {
+    return EVP_PKEY_RSA;
+  }
+  if (label == PEM_STRING_ECPRIVATEKEY) {
+    return EVP_PKEY_EC;
+  }
+  throw CryptoException("Private keys of the form " + Quote(label) + " are not supported.");
+}
+
+// RFC 1421, section 4.6.1.1.
+bool IsEncrypted(const PemBlock& block) noexcept {
+  return std::string_view(block.Header()).find("ENCRYPTED") != std::string_view::npos;
+}
+
+void Decrypt(PemBlock& block, Passphrase& passphrase) {
+  const OpenSsl::ErrorScope errors;
+  EVP_CIPHER_INFO cipher;
+  if (PEM_get_EVP_CIPHER_INFO(block.Header(), &cipher) != 1) {
+    throw CryptoException(errors.Describe(kUndecodable));
+  }
+  if (PEM_do_header(&cipher, block.Bytes(), &block.Length(), Passphrase::Read, &passphrase) != 1) {
+    passphrase.RethrowFailure();
+    throw CryptoException(errors.Describe(kUndecryptable));
+  }
+}
+
+OpenSsl::OwnedKey DecodeTraditional(PemBlock& block, Passphrase& passphrase) {
+  const int type = TraditionalTypeOf(block.Label());
+  const bool isEncrypted = IsEncrypted(block);
+  if (isEncrypted) {
+    Decrypt(block, passphrase);
+  }
+  const OpenSsl::ErrorScope errors;
+  const unsigned char* position = block.Bytes();
+  OpenSsl::OwnedKey key(d2i_PrivateKey(type, nullptr, &position, static_cast<long>(block.Size())));
+  if (key == nullptr) {
+    throw CryptoException(errors.Describe(isEncrypted ? kUndecryptable : kUndecodable));
+  }
+  return key;
+}
+
+OpenSsl::OwnedKey Decode(PemBlock& block, Passphrase& passphrase) {
+  if (block.Label() == PEM_STRING_PKCS8INF) {
+    return DecodePkcs8(block);
+  }
+  if (block.Label() == PEM_STRING_PKCS8) {
+    return DecodeEncryptedPkcs8(block, passphrase);
+  }
+  return DecodeTraditional(block, passphrase);
+}
+
+}  // namespace
+
+Ref<const PrivateKey> CreatePrivateKeyFromPem(std::string_view pem,
+                                              const PassphraseCallback& passphrase) {
+  PemBlock block = OnlyKeyBlock(pem);
+  Passphrase asked(passphrase);
+  return MakeRef<const PrivateKeyImpl>(Decode(block, asked));
+}
+
+Ref<const PrivateKey> LoadPrivateKey(const std::string& path,
+                                     const PassphraseCallback& passphrase) {
+  SensitiveText text;
+  ReadFile("private key", path, text);
+  return CreatePrivateKeyFromPem(text.Text(), passphrase);
+}
+
+}  // namespace Tarnik::Crypto

@@ -1,0 +1,74 @@
+#ifndef TARNIK_XML_SECURITY_NEW_SIGNATURE_H
+#define TARNIK_XML_SECURITY_NEW_SIGNATURE_H
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/xml/character_nodes.h>
+#include <tarnik/xml/security/signature.h>
+#include <cstddef>
+#include <vector>
+
+#include "crypto/private_key_impl.h"
+#include "xml/security/signature_impl.h"
+#include "xml/security/signature_plan.h"
+#include "xml/security/signature_reader.h"
+
+namespace Tarnik::Xml::Security {
+
+/// A signature that is made. Its element is whole from the start, but for the values; once these
+/// are there, what a reader would see is asked of a `SignatureImpl`.
+class NewSignature final : public Signature, public ObjectImpl {
+ public:
+  /// Throws as `CreateBlankSignature` does.
+  NewSignature(ElementNode* root, const std::string& c14nMethod, const std::string& signatureMethod,
+               const std::string& prefix);
+  ~NewSignature() override;
+
+  const std::string& CanonicalizationMethod() const override {
+    return content_.canonicalizationMethod;
+  }
+  const std::string& SignatureMethod() const override { return content_.signatureMethod; }
+  const std::vector<Reference>& References() const override { return Signed().References(); }
+  const Security::KeyInfo& KeyInfo() const override { return Signed().KeyInfo(); }
+  ElementNode* Element() const override { return element_.get(); }
+  bool Verify(const KeyInfoResolver* resolver) const override { return Signed().Verify(resolver); }
+  Ref<SignatureReference> AddReference(std::string_view uri,
+                                       std::string_view digestMethod) override;
+  void SetKeyInfo(ElementNode* content) override;
+  void Sign(const Crypto::PrivateKey* key) override;
+
+  /// `SignatureReference::AddTransform` for the reference with this index.
+  void AddTransform(std::size_t index, std::string_view algorithm);
+
+ private:
+  /// The elements of a reference that change. They live in the signature's tree.
+  struct ReferenceParts {
+    ElementNode* reference;
+    ElementNode* transforms;  // null before the first
+    ElementNode* digestMethod;
+    ElementNode* digestValue;
+    TextNode* digestText;
+  };
+  class UnfinishedValues;
+
+  Ref<ElementNode> MakeElement(std::string_view localName) const;
+  Ref<ElementNode> MakeAlgorithm(std::string_view localName, std::string_view algorithm) const;
+  void RequireBlank() const;
+  void RequirePlace(const Node* root) const;
+  const SignatureImpl& Signed() const;
+  std::vector<unsigned char> ValueBy(const Crypto::PrivateKeyImpl& key, const SignaturePlan& plan,
+                                     SignatureContent& content);
+
+  const std::string prefix_;
+  const Ref<ElementNode> root_;
+  Ref<ElementNode> element_;
+  ElementNode* signedInfo_ = nullptr;
+  TextNode* valueText_ = nullptr;
+  ElementNode* keyInfo_ = nullptr;
+  std::vector<ReferenceParts> parts_;
+  SignatureContent content_;
+  Ref<const SignatureImpl> signed_;
+};
+
+}  // namespace Tarnik::Xml::Security
+
+#endif

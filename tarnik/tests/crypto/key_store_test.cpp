@@ -1,0 +1,105 @@
+#include <gtest/gtest.h>
+#include <openssl/err.h>
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/crypto/private_key.h>
+#include <stdexcept>
+
+#include "support/key_texts.h"
+#include "support/test_pki.h"
+
+namespace Tarnik::Crypto {
+namespace {
+
+using Testing::TemporaryFile;
+using Tests::SharedRsaKey;
+using Tests::ToPkcs8Pem;
+
+constexpr const char* kSecret = "correct horse";
+
+std::string FileUri(const TemporaryFile& file) {
+  return "file:" + file.Path();
+}
+
+std::string LoadError(const std::string& uri, const PassphraseCallback& passphrase = {}) {
+  try {
+    LoadPrivateKeyFromUri(uri, passphrase);
+  } catch (const CryptoException& error) {
+    return error.Message();
+  }
+  return "loaded";
+}
+
+bool IsShared(const Ref<const PrivateKey>& key) {
+  return key->Matches(*Tests::MakeCertificate());
+}
+
+TEST(KeyStore, LoadsAKeyFromAFileUri) {
+  const TemporaryFile file(ToPkcs8Pem(SharedRsaKey()));
+  EXPECT_TRUE(IsShared(LoadPrivateKeyFromUri(FileUri(file))));
+}
+
+TEST(KeyStore, AsksOnceForThePassphraseOfAFile) {
+  const std::string secret = kSecret;
+  const TemporaryFile file(ToPkcs8Pem(SharedRsaKey(), &secret));
+  int asked = 0;
+  EXPECT_TRUE(IsShared(LoadPrivateKeyFromUri(FileUri(file), [&] {
+    ++asked;
+    return secret;
+  })));
+  EXPECT_EQ(asked, 1);
+}
+
+TEST(KeyStore, RefusesAnEncryptedFileWithoutThePassphrase) {
+  const std::string secret = kSecret;
+  const TemporaryFile file(ToPkcs8Pem(SharedRsaKey(), &secret));
+  EXPECT_EQ(LoadError(FileUri(file)), "The private key is encrypted, and no passphrase was given.");
+  int asked = 0;
+  const std::string wrong = LoadError(FileUri(file), [&] {
+    ++asked;
+    return std::string("battery staple");
+  });
+  EXPECT_EQ(asked, 1);
+  EXPECT_EQ(wrong.find("The URI 'file:' gives no private key, or the passphrase is wrong"), 0U)
+      << wrong;
+  EXPECT_THROW(LoadPrivateKeyFromUri(FileUri(file),
+                                     []() -> std::string { throw std::out_of_range("no vault"); }),
+               std::out_of_range);
+}
+
+TEST(KeyStore, RefusesAFileWithoutAKeyOrWithTwo) {
+  const TemporaryFile text("nothing here");
+  EXPECT_EQ(LoadError(FileUri(text)), "The URI 'file:' gives no private key.");
+  const TemporaryFile certificate(Testing::MakeCa("Root").Pem());
+  EXPECT_EQ(LoadError(FileUri(certificate)), "The URI 'file:' gives no private key.");
+  const OpenSsl::OwnedKey other = Tests::MakeEcKey("P-256");
+  const TemporaryFile two(ToPkcs8Pem(SharedRsaKey()) + ToPkcs8Pem(other.get()));
+  EXPECT_EQ(LoadError(FileUri(two)), "The URI 'file:' gives more than one private key.");
+}
+
+TEST(KeyStore, RefusesAFileThatIsNotThere) {
+  EXPECT_EQ(LoadError("file:/nonexistent/key.pem").find("The URI 'file:' gives no private key"),
+            0U);
+}
+
+TEST(KeyStore, RefusesASchemeThatNothingUnderstandsWithoutNamingSecrets) {
+  const std::string message = LoadError("vault:object=key?pin-value=1234");
+  EXPECT_EQ(message, "The URI 'vault:' gives no private key: unsupported.");
+}
+
+TEST(KeyStore, RefusesAUriWithoutAScheme) {
+  const char* const refusal = "The URI of the private key has no scheme or holds a NUL.";
+  EXPECT_EQ(LoadError(""), refusal);
+  EXPECT_EQ(LoadError("/etc/key.pem"), refusal);
+  EXPECT_EQ(LoadError(":key"), refusal);
+  EXPECT_EQ(LoadError(std::string("file:/a\0b", 9)), refusal);
+}
+
+TEST(KeyStore, LeavesTheCallersOpenSslErrorsAlone) {
+  ERR_clear_error();
+  EXPECT_NE(LoadError("vault:key"), "loaded");
+  EXPECT_EQ(ERR_peek_error(), 0U);
+}
+
+}  // namespace
+}  // namespace Tarnik::Crypto

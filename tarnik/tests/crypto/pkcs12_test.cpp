@@ -1,0 +1,197 @@
+#include <tarnik/crypto/private_key.h>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <cstring>
+#include <stdexcept>
+#include <vector>
+
+#include "support/test_pki.h"
+
+namespace Tarnik::Crypto {
+namespace {
+
+using Testing::Identity;
+using Testing::MakeCa;
+using Testing::MakeIdentity;
+
+constexpr const char* kSecret = "correct horse";
+
+struct Pki {
+  Identity root = MakeCa("Root");
+  Identity intermediate = MakeCa("Intermediate", &root);
+  Identity leaf = MakeIdentity({}, &intermediate);
+  Identity stranger = MakeIdentity({}, &root);
+
+  static const Pki& Get() {
+    static const Pki* const pki = new Pki();
+    return *pki;
+  }
+};
+
+struct Recipe {
+  const char* passphrase = kSecret;
+  EVP_PKEY* key = Pki::Get().leaf.key.get();
+  X509* certificate = Pki::Get().leaf.certificate.get();
+  std::vector<const Identity*> others = {};
+};
+
+OpenSsl::OwnedPkcs12 Make(const Recipe& recipe) {
+  STACK_OF(X509)* others = sk_X509_new_null();
+  for (const Identity* other : recipe.others) {
+    sk_X509_push(others, other->certificate.get());
+  }
+  OpenSsl::OwnedPkcs12 made(PKCS12_create(recipe.passphrase, nullptr, recipe.key,
+                                          recipe.certificate, others, 0, 0, 100, 100, 0));
+  sk_X509_free(others);
+  if (made == nullptr) {
+    throw std::runtime_error("test set-up failed: PKCS#12");
+  }
+  return made;
+}
+
+std::string Encode(PKCS12* pkcs12) {
+  unsigned char* bytes = nullptr;
+  const int length = i2d_PKCS12(pkcs12, &bytes);
+  const OpenSsl::OwnedMemory<unsigned char> owner(bytes);
+  return {reinterpret_cast<const char*>(bytes), static_cast<std::size_t>(length)};
+}
+
+KeyAndCertificate Load(const std::string& bytes, const PassphraseCallback& passphrase = {}) {
+  return CreateKeyAndCertificateFromPkcs12(reinterpret_cast<const unsigned char*>(bytes.data()),
+                                           bytes.size(), passphrase);
+}
+
+std::string LoadError(const std::string& bytes, const char* passphrase = kSecret) {
+  try {
+    Load(
+        bytes, passphrase == nullptr ? PassphraseCallback()
+                                     : [passphrase] { return std::string(passphrase); });
+  } catch (const CryptoException& error) {
+    return error.Message();
+  }
+  return "loaded";
+}
+
+/// Adds a second key to a PKCS#12 without a passphrase on its content, as some programs write it.
+std::string WithTwoKeys() {
+  STACK_OF(PKCS12_SAFEBAG)* bags = nullptr;
+  PKCS12_add_key(&bags, Pki::Get().leaf.key.get(), 0, 100, -1, kSecret);
+  PKCS12_add_key(&bags, Pki::Get().stranger.key.get(), 0, 100, -1, kSecret);
+  STACK_OF(PKCS7)* safes = nullptr;
+  PKCS12_add_safe(&safes, bags, -1, 0, nullptr);
+  sk_PKCS12_SAFEBAG_pop_free(bags, PKCS12_SAFEBAG_free);
+  const OpenSsl::OwnedPkcs12 pkcs12(PKCS12_add_safes(safes, 0));
+  sk_PKCS7_pop_free(safes, PKCS7_free);
+  PKCS12_set_mac(pkcs12.get(), kSecret, -1, nullptr, 0, 100, EVP_sha256());
+  return Encode(pkcs12.get());
+}
+
+TEST(Pkcs12, GivesTheKeyItsCertificateAndTheChain) {
+  Recipe recipe;
+  recipe.others = {&Pki::Get().intermediate, &Pki::Get().root};
+  int asked = 0;
+  const KeyAndCertificate loaded = Load(Encode(Make(recipe).get()), [&asked] {
+    ++asked;
+    return std::string(kSecret);
+  });
+  EXPECT_EQ(asked, 1);
+  EXPECT_EQ(loaded.certificate, Pki::Get().leaf.ToCertificate());
+  EXPECT_TRUE(loaded.privateKey->Matches(*loaded.certificate));
+  ASSERT_EQ(loaded.chain.size(), 2U);
+  EXPECT_EQ(loaded.chain[0], Pki::Get().intermediate.ToCertificate());
+  EXPECT_EQ(loaded.chain[1], Pki::Get().root.ToCertificate());
+}
+
+TEST(Pkcs12, IsLoadedWithoutAQuestionWhenThePassphraseIsEmpty) {
+  for (const char* passphrase : {static_cast<const char*>(nullptr), ""}) {
+    Recipe recipe;
+    recipe.passphrase = passphrase;
+    const KeyAndCertificate loaded =
+        Load(Encode(Make(recipe).get()), []() -> std::string { throw std::logic_error("asked"); });
+    EXPECT_TRUE(loaded.privateKey->Matches(*loaded.certificate));
+    EXPECT_TRUE(loaded.chain.empty());
+  }
+}
+
+TEST(Pkcs12, RefusesAWrongPassphraseAndNone) {
+  const std::string bytes = Encode(Make({}).get());
+  EXPECT_EQ(LoadError(bytes, nullptr),
+            "The private key is encrypted, and no passphrase was given.");
+  EXPECT_EQ(LoadError(bytes, "battery staple"),
+            "The passphrase of the PKCS#12 is wrong, or the PKCS#12 is broken.");
+  EXPECT_THROW(Load(bytes, []() -> std::string { throw std::out_of_range("no vault"); }),
+               std::out_of_range);
+}
+
+TEST(Pkcs12, RefusesAPassphraseWithANul) {
+  try {
+    Load(Encode(Make({}).get()), [] { return std::string(kSecret) + '\0'; });
+    FAIL() << "loaded";
+  } catch (const CryptoException& error) {
+    EXPECT_EQ(error.Message(), "The passphrase of a PKCS#12 cannot hold a NUL.");
+  }
+}
+
+TEST(Pkcs12, RefusesWhatIsNotThere) {
+  Recipe keyless;
+  keyless.key = nullptr;
+  EXPECT_EQ(LoadError(Encode(Make(keyless).get())), "The PKCS#12 holds no private key.");
+  Recipe bare;
+  bare.certificate = nullptr;
+  EXPECT_EQ(LoadError(Encode(Make(bare).get())), "The PKCS#12 holds no certificate.");
+  Recipe mismatched;
+  mismatched.certificate = nullptr;
+  mismatched.others = {&Pki::Get().stranger};
+  EXPECT_EQ(LoadError(Encode(Make(mismatched).get())),
+            "No certificate of the PKCS#12 belongs to its private key.");
+}
+
+TEST(Pkcs12, RefusesASecondKey) {
+  EXPECT_EQ(LoadError(WithTwoKeys()), "The PKCS#12 holds more than one private key.");
+}
+
+TEST(Pkcs12, RefusesOneThatNothingProtectsAgainstChanges) {
+  Recipe recipe;
+  STACK_OF(X509)* none = nullptr;
+  const OpenSsl::OwnedPkcs12 made(PKCS12_create(recipe.passphrase, nullptr, recipe.key,
+                                                recipe.certificate, none, 0, 0, 100, -1, 0));
+  EXPECT_EQ(LoadError(Encode(made.get())),
+            "The PKCS#12 is not protected against changes by a passphrase.");
+}
+
+TEST(Pkcs12, RefusesBytesThatAreNone) {
+  for (const std::string& bytes :
+       {std::string(), std::string("text"), std::string("\x30\x00", 2)}) {
+    EXPECT_EQ(LoadError(bytes).find("The PKCS#12 cannot be decoded"), 0U);
+  }
+  EXPECT_THROW(CreateKeyAndCertificateFromPkcs12(nullptr, 0), CryptoException);
+}
+
+TEST(Pkcs12, RefusesEveryPrefixOfItself) {
+  const std::string bytes = Encode(Make({}).get());
+  for (std::size_t length = 0; length < bytes.size(); length += 13) {
+    EXPECT_NE(LoadError(bytes.substr(0, length)), "loaded") << length;
+  }
+}
+
+TEST(Pkcs12, IsLoadedFromAFile) {
+  const Testing::TemporaryFile file(Encode(Make({}).get()));
+  const KeyAndCertificate loaded =
+      LoadKeyAndCertificate(file.Path(), [] { return std::string(kSecret); });
+  EXPECT_EQ(loaded.certificate, Pki::Get().leaf.ToCertificate());
+}
+
+TEST(Pkcs12, NamesTheFileThatCannotBeRead) {
+  try {
+    LoadKeyAndCertificate("/nonexistent/key.p12");
+    FAIL() << "loaded";
+  } catch (const IOException& error) {
+    EXPECT_EQ(error.Message(),
+              "The PKCS#12 file '/nonexistent/key.p12' cannot be read: No such file or directory.");
+  }
+}
+
+}  // namespace
+}  // namespace Tarnik::Crypto
