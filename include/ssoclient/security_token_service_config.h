@@ -4,6 +4,9 @@
 #include <memory>
 #include <string>
 
+#include <boost/optional.hpp>
+
+#include <ssoclient/holder_of_key_config.h>
 #include <ssoclient/saml_token_factory.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/http/http_user_agent.h>
@@ -24,6 +27,9 @@ struct SecurityTokenServiceConfig {
   std::shared_ptr<SamlTokenFactory> tokenFactory;
   /// The name that the service's TLS certificate must carry; the URL's host if empty.
   std::string sslPeerName;
+  /// The key for holder-of-key tokens. Without it all tokens are bearer tokens, and the operations
+  /// by certificate, by token and to renew are refused.
+  boost::optional<HolderOfKeyConfig> holderOfKeyConfig;
   /// Whom to trust with TLS; may be null for a plain http URL.
   Tarnik::Ssl::SSLContext* sslContext = nullptr;
   /// Look for a replacement host before each connection. No source of replacements is built in, so
@@ -39,6 +45,8 @@ struct SecurityTokenServiceConfigEx {
   Tarnik::Ref<Tarnik::Http::UserAgent> userAgent;
   /// Turns answered assertions into verified tokens; must not be null.
   std::shared_ptr<SamlTokenFactory> tokenFactory;
+  /// As above.
+  boost::optional<HolderOfKeyConfig> holderOfKeyConfig;
 };
 
 }  // namespace SsoClient

@@ -1,8 +1,10 @@
 #ifndef SSOCLIENT_STS_REQUEST_BUILDER_H
 #define SSOCLIENT_STS_REQUEST_BUILDER_H
 
+#include <cstdint>
 #include <string>
 
+#include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>
 
 #include "transport/soap_request.h"
@@ -10,13 +12,30 @@
 namespace SsoClient {
 
 /// Makes the requests of a service's operations. Safe from many threads.
+///
+/// In each operation `request` is assigned only on success. Each throws
+///  - `Tarnik::InvalidArgumentException` when a lifetime is not positive, and when a text cannot be
+///    sent: the message then names its element, never the text;
+///  - `Tarnik::InvalidStateException` when a key is needed and there is none, and when the
+///    certificate of the key is not valid now;
+///  - `Tarnik::Xml::XMLParseException` when the text of a presented token is malformed;
+///  - `Tarnik::Xml::Security::XmlSecurityException` when the key cannot sign.
 class RequestBuilder {
  public:
-  /// A request for a token by user name and password. `request` is assigned only on success.
-  /// Throws `Tarnik::InvalidArgumentException` when the lifetime is not positive, and when a text
-  /// cannot be sent: the message then names its element, never the text.
+  /// A token by user name and password; signed if the token is to be bound to the key.
   virtual void BuildAcquireTokenRequest(const std::string& userName, const std::string& password,
                                         const TokenSpec& spec, SoapRequest& request) const = 0;
+  /// A token by the certificate of the key. The spec's confirmation must be the default one.
+  virtual void BuildAcquireTokenByCertificateRequest(const TokenSpec& spec,
+                                                     SoapRequest& request) const = 0;
+  /// A token on the strength of `token`, which is bound to the key.
+  virtual void BuildAcquireTokenByTokenRequest(const SamlToken& token, const TokenSpec& spec,
+                                               SoapRequest& request) const = 0;
+  /// The status of `token`.
+  virtual void BuildValidateRequest(const SamlToken& token, SoapRequest& request) const = 0;
+  /// A new lifetime of `lifetimeSec` seconds for `token`, which must be a holder-of-key token.
+  virtual void BuildRenewRequest(const SamlToken& token, std::int64_t lifetimeSec,
+                                 SoapRequest& request) const = 0;
 
  protected:
   ~RequestBuilder() = default;

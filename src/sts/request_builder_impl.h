@@ -3,15 +3,35 @@
 
 #include <string>
 
+#include <boost/optional.hpp>
+
+#include <ssoclient/holder_of_key_config.h>
+
 #include "sts/request_builder.h"
 
 namespace SsoClient {
 
-/// Builds unsigned requests for bearer tokens.
+/// Builds requests, and signs with a key those that prove its possession.
 class RequestBuilderImpl final : public RequestBuilder {
  public:
+  explicit RequestBuilderImpl(boost::optional<HolderOfKeyConfig> holderOfKeyConfig);
+
   void BuildAcquireTokenRequest(const std::string& userName, const std::string& password,
                                 const TokenSpec& spec, SoapRequest& request) const override;
+  void BuildAcquireTokenByCertificateRequest(const TokenSpec& spec,
+                                             SoapRequest& request) const override;
+  void BuildAcquireTokenByTokenRequest(const SamlToken& token, const TokenSpec& spec,
+                                       SoapRequest& request) const override;
+  void BuildValidateRequest(const SamlToken& token, SoapRequest& request) const override;
+  void BuildRenewRequest(const SamlToken& token, std::int64_t lifetimeSec,
+                         SoapRequest& request) const override;
+
+ private:
+  const HolderOfKeyConfig& RequireHolderOfKey(const std::string& operation) const;
+  bool AsksForHolderOfKey(const TokenSpec& spec) const;
+  bool IsSigned(const TokenSpec& spec) const;
+
+  boost::optional<HolderOfKeyConfig> holderOfKeyConfig_;
 };
 
 }  // namespace SsoClient

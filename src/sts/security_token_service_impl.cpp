@@ -4,29 +4,36 @@
 
 #include "describe/describe.h"
 #include "sts/logger.h"
+#include "sts/pass_by_ref_helper.h"
 #include "sts/secret_text.h"
 #include "sts/sync_to_async_call.h"
+#include "token/default_clock_tolerance.h"
 
 namespace SsoClient {
 
 namespace {
 
-constexpr long kClockToleranceSec = 600;
+using TokenHandle = std::shared_ptr<const SamlToken>;
 
-void LogRequest(const std::string& userName, const TokenSpec& spec) {
-  if (!kLogger.IsEnabled(kTraceLevel)) {
-    return;
-  }
-  Tarnik::Service::LogInternal(kLogger, kTraceLevel, "Requested token for subject `%1', spec `%2'",
-                               {userName, Describe(spec)});
+Tarnik::PrintFormatter Printed(const TokenSpec& spec) {
+  return Describe(spec);
 }
 
-void LogToken(const SamlToken& token) {
-  if (!kLogger.IsEnabled(kSuccessLevel)) {
-    return;
+Tarnik::PrintFormatter Printed(const SamlToken& token) {
+  return CreateSamlTokenDescription(token);
+}
+
+template <class Value>
+Tarnik::PrintFormatter Printed(const Value& value) {
+  return value;
+}
+
+// Describes the arguments only when the line is written.
+template <class... Arguments>
+void Log(int level, std::string_view format, const Arguments&... arguments) {
+  if (kLogger.IsEnabled(level)) {
+    Tarnik::Service::LogInternal(kLogger, level, format, {Printed(arguments)...});
   }
-  Tarnik::Service::LogInternal(kLogger, kSuccessLevel, "Successfully acquired token: %1",
-                               {CreateSamlTokenDescription(token)});
 }
 
 }  // namespace
@@ -41,21 +48,54 @@ SecurityTokenServiceImpl::SecurityTokenServiceImpl(
       responseHandler_(std::move(responseHandler)),
       tokenFactory_(std::move(tokenFactory)) {}
 
-std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(
-    const std::string& userName, const std::string& password, const TokenSpec& spec) const {
+TokenHandle SecurityTokenServiceImpl::AcquireToken(const std::string& userName,
+                                                   const std::string& password,
+                                                   const TokenSpec& spec) const {
   const OperationLog operation("AcquireToken");
-  LogRequest(userName, spec);
+  Log(kTraceLevel, "Requested token for subject `%1', spec `%2'", userName, spec);
   SoapRequest request;
   requestBuilder_->BuildAcquireTokenRequest(userName, password, spec, request);
-  Tarnik::Service::LogInternal(kLogger, kTraceLevel,
-                               "SecurityTokenServiceImpl::AcquireToken sending request", {});
-  Tarnik::Ref<Tarnik::Reader> response;
-  const auto session = transport_->CreateSession();
-  session->SendRequest(request, response);
-  Tarnik::Service::LogInternal(kLogger, kTraceLevel,
-                               "SecurityTokenServiceImpl::AcquireToken processing response", {});
+  Log(kTraceLevel, "SecurityTokenServiceImpl::AcquireToken sending request");
+  const auto response = Send(request);
+  Log(kTraceLevel, "SecurityTokenServiceImpl::AcquireToken processing response");
+  return MakeIssuedToken(response.get());
+}
+
+TokenHandle SecurityTokenServiceImpl::AcquireTokenByCertificate(const TokenSpec& spec) const {
+  const OperationLog operation("AcquireTokenByCertificate");
+  Log(kTraceLevel, "Requested token with spec `%1'", spec);
+  SoapRequest request;
+  requestBuilder_->BuildAcquireTokenByCertificateRequest(spec, request);
+  return MakeIssuedToken(Send(request).get());
+}
+
+TokenHandle SecurityTokenServiceImpl::AcquireTokenByToken(const SamlToken& token,
+                                                          const TokenSpec& spec) const {
+  const OperationLog operation("AcquireTokenByToken");
+  Log(kTraceLevel, "Requested token for %1 with spec `%2'", token, spec);
+  SoapRequest request;
+  requestBuilder_->BuildAcquireTokenByTokenRequest(token, spec, request);
+  return MakeIssuedToken(Send(request).get());
+}
+
+bool SecurityTokenServiceImpl::ValidateSubject(const SamlToken& token) const {
+  const OperationLog operation("ValidateSubject");
+  Log(kTraceLevel, "Validating subject of token %1", token);
+  SoapRequest request;
+  requestBuilder_->BuildValidateRequest(token, request);
+  const bool isValid = responseHandler_->ParseValidateResponse(Send(request).get());
+  Log(kTraceLevel, "Result: %1", isValid);
+  return isValid;
+}
+
+TokenHandle SecurityTokenServiceImpl::RenewToken(const SamlToken& token,
+                                                 std::int64_t lifetimeSec) const {
+  const OperationLog operation("RenewToken");
+  Log(kTraceLevel, "Renewing token %1 for %2 more seconds", token, lifetimeSec);
+  SoapRequest request;
+  requestBuilder_->BuildRenewRequest(token, lifetimeSec, request);
   SecretText assertion;
-  responseHandler_->ParseIssueResponse(response.get(), assertion.text);
+  responseHandler_->ParseRenewResponse(Send(request).get(), assertion.text);
   return MakeToken(assertion.text);
 }
 
@@ -64,23 +104,72 @@ void SecurityTokenServiceImpl::AcquireTokenAsync(const std::string& userName,
                                                  TokenCallback callback) const {
   // Shared, since a work item is copied about: the password then stands in memory only once, and is
   // cleansed with the last copy.
-  auto secret = std::make_shared<const SecretText>(password);
-  auto service = std::make_shared<const SecurityTokenServiceImpl>(*this);
-  SyncToAsyncCall<std::shared_ptr<const SamlToken>>(
-      [service = std::move(service), userName, secret = std::move(secret), spec] {
+  SyncToAsyncCall<TokenHandle>(
+      [service = Copy(), userName, secret = std::make_shared<const SecretText>(password), spec] {
         return service->AcquireToken(userName, secret->text, spec);
       },
       std::move(callback));
 }
 
-std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::MakeToken(
-    const std::string& assertion) const {
+void SecurityTokenServiceImpl::AcquireTokenByCertificateAsync(const TokenSpec& spec,
+                                                              TokenCallback callback) const {
+  SyncToAsyncCall<TokenHandle>(
+      [service = Copy(), spec] { return service->AcquireTokenByCertificate(spec); },
+      std::move(callback));
+}
+
+void SecurityTokenServiceImpl::AcquireTokenByTokenAsync(const SamlToken& token,
+                                                        const TokenSpec& spec,
+                                                        TokenCallback callback) const {
+  SyncToAsyncCall<TokenHandle>(
+      [service = Copy(), presented = PassByRefHelper(token), spec] {
+        return service->AcquireTokenByToken(presented.Get(), spec);
+      },
+      std::move(callback));
+}
+
+void SecurityTokenServiceImpl::ValidateSubjectAsync(const SamlToken& token,
+                                                    ValidateCallback callback) const {
+  SyncToAsyncCall<boost::optional<bool>>(
+      [service = Copy(), presented = PassByRefHelper(token)] {
+        return boost::optional<bool>(service->ValidateSubject(presented.Get()));
+      },
+      std::move(callback));
+}
+
+void SecurityTokenServiceImpl::RenewTokenAsync(const SamlToken& token, std::int64_t lifetimeSec,
+                                               TokenCallback callback) const {
+  SyncToAsyncCall<TokenHandle>(
+      [service = Copy(), presented = PassByRefHelper(token), lifetimeSec] {
+        return service->RenewToken(presented.Get(), lifetimeSec);
+      },
+      std::move(callback));
+}
+
+std::shared_ptr<const SecurityTokenServiceImpl> SecurityTokenServiceImpl::Copy() const {
+  return std::make_shared<const SecurityTokenServiceImpl>(*this);
+}
+
+Tarnik::Ref<Tarnik::Reader> SecurityTokenServiceImpl::Send(const SoapRequest& request) const {
+  Tarnik::Ref<Tarnik::Reader> response;
+  const auto session = transport_->CreateSession();
+  session->SendRequest(request, response);
+  return response;
+}
+
+TokenHandle SecurityTokenServiceImpl::MakeIssuedToken(Tarnik::Reader* response) const {
+  SecretText assertion;
+  responseHandler_->ParseIssueResponse(response, assertion.text);
+  return MakeToken(assertion.text);
+}
+
+TokenHandle SecurityTokenServiceImpl::MakeToken(const std::string& assertion) const {
   if (assertion.empty()) {
     return nullptr;
   }
-  auto token = tokenFactory_->CreateToken(assertion, kClockToleranceSec);
+  auto token = tokenFactory_->CreateToken(assertion, kDefaultClockToleranceSec);
   if (token != nullptr) {
-    LogToken(*token);
+    Log(kSuccessLevel, "Successfully acquired token: %1", *token);
   }
   return token;
 }

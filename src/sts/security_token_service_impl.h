@@ -23,10 +23,27 @@ class SecurityTokenServiceImpl final : public SecurityTokenService {
   std::shared_ptr<const SamlToken> AcquireToken(const std::string& userName,
                                                 const std::string& password,
                                                 const TokenSpec& spec) const override;
+  std::shared_ptr<const SamlToken> AcquireTokenByCertificate(const TokenSpec& spec) const override;
+  std::shared_ptr<const SamlToken> AcquireTokenByToken(const SamlToken& token,
+                                                       const TokenSpec& spec) const override;
+  bool ValidateSubject(const SamlToken& token) const override;
+  std::shared_ptr<const SamlToken> RenewToken(const SamlToken& token,
+                                              std::int64_t lifetimeSec) const override;
+
   void AcquireTokenAsync(const std::string& userName, const std::string& password,
                          const TokenSpec& spec, TokenCallback callback) const override;
+  void AcquireTokenByCertificateAsync(const TokenSpec& spec, TokenCallback callback) const override;
+  void AcquireTokenByTokenAsync(const SamlToken& token, const TokenSpec& spec,
+                                TokenCallback callback) const override;
+  void ValidateSubjectAsync(const SamlToken& token, ValidateCallback callback) const override;
+  void RenewTokenAsync(const SamlToken& token, std::int64_t lifetimeSec,
+                       TokenCallback callback) const override;
 
  private:
+  /// What an asynchronous call works with: it may outlive this object.
+  std::shared_ptr<const SecurityTokenServiceImpl> Copy() const;
+  Tarnik::Ref<Tarnik::Reader> Send(const SoapRequest& request) const;
+  std::shared_ptr<const SamlToken> MakeIssuedToken(Tarnik::Reader* response) const;
   std::shared_ptr<const SamlToken> MakeToken(const std::string& assertion) const;
 
   std::shared_ptr<const RequestBuilder> requestBuilder_;

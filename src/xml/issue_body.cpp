@@ -1,16 +1,17 @@
 #include "xml/issue_body.h"
-#include "token/saml_names.h"
 
 #include <string>
 
 #include <tarnik/core/exception.h>
 
 #include "deployment.h"
+#include "token/saml_names.h"
 #include "xml/advice_builders.h"
 #include "xml/builder_factories.h"
 #include "xml/lifetime.h"
 #include "xml/namespaces.h"
 #include "xml/participants.h"
+#include "xml/username_token.h"
 
 namespace SsoClient {
 
@@ -29,10 +30,8 @@ std::shared_ptr<XMLBaseBuilder> BuildDelegateTo(const boost::optional<std::strin
   if (!delegateTo) {
     return nullptr;
   }
-  auto token = MakeCompositeBuilder("wsse", "UsernameToken", {{"xmlns:wsse", kWsseNamespace}});
-  token->Add(MakeTextElementBuilder("wsse", "Username", *delegateTo));
   auto element = MakeCompositeBuilder("wst", "DelegateTo");
-  element->Add(token);
+  element->Add(BuildUsernameToken(*delegateTo));
   return element;
 }
 
@@ -95,7 +94,7 @@ std::shared_ptr<XMLCompositeBuilder> BuildIssueBodyWithUseKey(unsigned keyType,
                                                               const TokenSpec& spec) {
   auto body = BuildIssueBody(keyType, spec);
   if (keyType == kHolderOfKey && !spec.delegateTo) {
-    body->Add(MakeElementBuilder("wst", "UseKey", {{"Sig", "holderOfKeyProofSignature"}}));
+    body->Add(MakeElementBuilder("wst", "UseKey", {{"Sig", kProofSignatureId}}));
   }
   return body;
 }

@@ -14,6 +14,11 @@ inline constexpr char kWsseNamespace[] =
 inline constexpr char kWsuNamespace[] =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
 
+/// The namespace of wsse11:TokenType. The standard itself has another one (Web Services Security:
+/// SOAP Message Security 1.1, section 2.2); services expect this.
+inline constexpr char kWsse11Namespace[] =
+    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.1.xsd";
+
 /// WS-Addressing 1.0.
 inline constexpr char kWsaNamespace[] = "http://www.w3.org/2005/08/addressing";
 
@@ -22,6 +27,15 @@ inline constexpr char kSoapNamespace[] = "http://schemas.xmlsoap.org/soap/envelo
 
 inline constexpr char kXmlSchemaNamespace[] = "http://www.w3.org/2001/XMLSchema";
 inline constexpr char kXmlSchemaInstanceNamespace[] = "http://www.w3.org/2001/XMLSchema-instance";
+
+/// How binary tokens are written: in Base64 (Web Services Security: SOAP Message Security 1.0,
+/// section 6.3).
+inline constexpr char kBase64BinaryEncoding[] =
+    "http://docs.oasis-open.org/wss/2004/01/"
+    "oasis-200401-wss-soap-message-security-1.0#Base64Binary";
+
+/// The Id of a request's signature, by which wst:UseKey names it.
+inline constexpr char kProofSignatureId[] = "holderOfKeyProofSignature";
 
 }  // namespace SsoClient
 

@@ -28,13 +28,13 @@ TokenSpec SpecOf(std::int64_t seconds) {
 std::string BuiltBody(const TokenSpec& spec, const std::string& user = "alice",
                       const std::string& password = "pw") {
   SoapRequest request;
-  RequestBuilderImpl().BuildAcquireTokenRequest(user, password, spec, request);
+  RequestBuilderImpl(boost::none).BuildAcquireTokenRequest(user, password, spec, request);
   return request.body;
 }
 
 TEST(RequestBuilderImplTest, APasswordRequestIsAnUnsignedEnvelopeThatAsksForABearerToken) {
   SoapRequest request;
-  RequestBuilderImpl().BuildAcquireTokenRequest("alice", "p<w", SpecOf(3600), request);
+  RequestBuilderImpl(boost::none).BuildAcquireTokenRequest("alice", "p<w", SpecOf(3600), request);
   EXPECT_EQ(request.action, kIssueAction);
   EXPECT_EQ(
       Testing::WithoutTimes(request.body),
@@ -91,7 +91,7 @@ TEST(RequestBuilderImplTest, TheLifetimeMustBePositive) {
     request.action = "kept";
     request.body = "kept too";
     try {
-      RequestBuilderImpl().BuildAcquireTokenRequest("alice", "pw", SpecOf(seconds), request);
+      RequestBuilderImpl(boost::none).BuildAcquireTokenRequest("alice", "pw", SpecOf(seconds), request);
       ADD_FAILURE() << seconds;
     } catch (const Tarnik::InvalidArgumentException& error) {
       EXPECT_EQ(error.Message(), "Token lifetime must be positive");
@@ -111,7 +111,7 @@ TEST(RequestBuilderImplTest, CredentialsThatXmlCannotCarryAreRefusedByElement) {
   const auto failure = [](const std::string& user, const std::string& password) {
     SoapRequest request;
     try {
-      RequestBuilderImpl().BuildAcquireTokenRequest(user, password, SpecOf(60), request);
+      RequestBuilderImpl(boost::none).BuildAcquireTokenRequest(user, password, SpecOf(60), request);
     } catch (const Tarnik::InvalidArgumentException& error) {
       EXPECT_EQ(request.body, "");
       return error.Message();
@@ -129,7 +129,7 @@ TEST(RequestBuilderImplTest, CredentialsThatXmlCannotCarryAreRefusedByElement) {
 }
 
 TEST(RequestBuilderImplTest, TheOperationStandsFirst) {
-  const RequestBuilderImpl builder;
+  const RequestBuilderImpl builder(boost::none);
   const RequestBuilder& object = builder;
   SoapRequest request;
   using Build =

@@ -119,7 +119,7 @@ class SecurityTokenServiceImplTest : public testing::Test {
       : transport_(std::make_shared<FakeTransport>(answer)) {}
 
   std::shared_ptr<SecurityTokenServiceImpl> MakeService() const {
-    return std::make_shared<SecurityTokenServiceImpl>(std::make_shared<RequestBuilderImpl>(),
+    return std::make_shared<SecurityTokenServiceImpl>(std::make_shared<RequestBuilderImpl>(boost::none),
                                                       transport_, handler_, factory_);
   }
 

@@ -1,0 +1,22 @@
+#ifndef SSOCLIENT_HOLDER_OF_KEY_CONFIG_H
+#define SSOCLIENT_HOLDER_OF_KEY_CONFIG_H
+
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/private_key.h>
+
+namespace SsoClient {
+
+/// The key that a service proves to possess, so that tokens can be bound to it. Neither may be
+/// null.
+struct HolderOfKeyConfig {
+  /// The client's certificate, which requests carry. Signing is refused before and after its
+  /// period of validity, give or take 600 seconds.
+  Tarnik::Ref<const Tarnik::Crypto::Certificate> certificate;
+  /// The certificate's private key: RSA of at least 2048 bits. Used only to sign.
+  Tarnik::Ref<const Tarnik::Crypto::PrivateKey> privateKey;
+};
+
+}  // namespace SsoClient
+
+#endif

@@ -1,0 +1,60 @@
+#include "sts/holder_of_key_check.h"
+
+#include <string>
+
+#include <tarnik/core/exception.h>
+
+#include "token/default_clock_tolerance.h"
+
+namespace SsoClient {
+
+namespace {
+
+using Tarnik::Crypto::KeyAlgorithm;
+using Tarnik::System::DateTime;
+
+constexpr int kMinRsaBits = 2048;  // NIST SP 800-131A
+
+void Require(bool isGood, const char* complaint) {
+  if (!isGood) {
+    throw Tarnik::InvalidArgumentException(std::string("HolderOfKeyConfig: ") + complaint);
+  }
+}
+
+DateTime SecondsLater(const DateTime& time, long seconds) {
+  return Tarnik::System::DateTimeFromUtc(
+      Tarnik::System::SaturatingAdd(time.GetUtcTime(), seconds * 1'000'000), false);
+}
+
+std::string Describe(const Tarnik::Crypto::Certificate& certificate) {
+  return "The holder-of-key certificate of `" + certificate.SubjectName() + "'";
+}
+
+}  // namespace
+
+void CheckHolderOfKeyConfig(const boost::optional<HolderOfKeyConfig>& config) {
+  if (!config) {
+    return;
+  }
+  Require(config->certificate != nullptr, "the certificate must not be null.");
+  Require(config->privateKey != nullptr, "the private key must not be null.");
+  Require(config->privateKey->Matches(*config->certificate),
+          "the private key does not belong to the certificate.");
+  const auto key = config->privateKey->GetPublicKey();
+  Require(key->Algorithm() == KeyAlgorithm::kRsa,
+          "the key must be an RSA key, since requests are signed with RSA-SHA256.");
+  Require(key->Bits() >= kMinRsaBits, "the RSA key must have at least 2048 bits.");
+}
+
+void CheckPeriodOfValidity(const Tarnik::Crypto::Certificate& certificate, const DateTime& now) {
+  if (now < SecondsLater(certificate.NotBefore(), -kDefaultClockToleranceSec)) {
+    throw Tarnik::InvalidStateException(Describe(certificate) + " is not valid before " +
+                                        certificate.NotBefore().ToString());
+  }
+  if (now > SecondsLater(certificate.NotAfter(), kDefaultClockToleranceSec)) {
+    throw Tarnik::InvalidStateException(Describe(certificate) + " expired at " +
+                                        certificate.NotAfter().ToString());
+  }
+}
+
+}  // namespace SsoClient
