@@ -1,6 +1,5 @@
 #include "faults/fault_injection.h"
 
-#include <expat.h>
 #include <openssl/evp.h>
 
 #include <cstdlib>
@@ -32,10 +31,6 @@ bool Fails(Kind kind) noexcept {
 
 void* Allocate(std::size_t size) noexcept {
   return Fails(Kind::kAllocation) ? nullptr : __real_malloc(size);
-}
-
-void* Reallocate(void* memory, std::size_t size) noexcept {
-  return Fails(Kind::kAllocation) ? nullptr : std::realloc(memory, size);
 }
 
 }  // namespace
@@ -75,12 +70,6 @@ extern "C" {
 
 void* __wrap_malloc(std::size_t size) {
   return FaultInjection::Allocate(size);
-}
-
-XML_Parser __wrap_XML_ParserCreate(const XML_Char* encoding) {
-  static const XML_Memory_Handling_Suite kMemory{FaultInjection::Allocate,
-                                                 FaultInjection::Reallocate, std::free};
-  return XML_ParserCreate_MM(encoding, &kMemory, nullptr);
 }
 
 int __real_EVP_DigestInit_ex2(EVP_MD_CTX* context, const EVP_MD* type, const OSSL_PARAM* params);

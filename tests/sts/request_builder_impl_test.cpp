@@ -91,7 +91,8 @@ TEST(RequestBuilderImplTest, TheLifetimeMustBePositive) {
     request.action = "kept";
     request.body = "kept too";
     try {
-      RequestBuilderImpl(boost::none).BuildAcquireTokenRequest("alice", "pw", SpecOf(seconds), request);
+      RequestBuilderImpl(boost::none)
+          .BuildAcquireTokenRequest("alice", "pw", SpecOf(seconds), request);
       ADD_FAILURE() << seconds;
     } catch (const Tarnik::InvalidArgumentException& error) {
       EXPECT_EQ(error.Message(), "Token lifetime must be positive");

@@ -8,13 +8,16 @@
 
 namespace SsoClient::Testing {
 
-/// A token that is nothing but its text and its subject's name.
+/// A token that is nothing but its text, its subject's name and what a test sets.
 class FakeSamlToken final : public SamlToken {
  public:
   explicit FakeSamlToken(std::string xml, std::string subjectName = "alice")
       : xml_(std::move(xml)), subject_{std::move(subjectName), "CORP"} {}
 
-  const std::string& Id() const override { return empty_; }
+  std::string id;
+  TokenConfirmationType confirmationType = BEARER;
+
+  const std::string& Id() const override { return id; }
   const Tarnik::System::DateTime& StartTime() const override { return time_; }
   const Tarnik::System::DateTime& ExpirationTime() const override { return time_; }
   Tarnik::System::DateTime ExpirationTimeWithTolerance() const override { return time_; }
@@ -22,7 +25,7 @@ class FakeSamlToken final : public SamlToken {
   bool IsRenewable() const override { return false; }
   bool IsDelegable() const override { return false; }
   bool IsSolution() const override { return false; }
-  TokenConfirmationType ConfirmationType() const override { return BEARER; }
+  TokenConfirmationType ConfirmationType() const override { return confirmationType; }
   void GetSubjectNames(SubjectNames& names) const override { names = {}; }
   void GetGroups(std::vector<PrincipalId>& groups) const override { groups.clear(); }
   void GetDelegationChain(std::vector<Delegate>& chain) const override { chain.clear(); }

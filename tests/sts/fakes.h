@@ -1,0 +1,117 @@
+#ifndef SSOCLIENT_TESTS_STS_FAKES_H
+#define SSOCLIENT_TESTS_STS_FAKES_H
+
+#include <future>
+#include <memory>
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <typeinfo>
+#include <utility>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/saml_token_factory.h>
+#include <ssoclient/security_token_service.h>
+
+#include "support/fake_saml_token.h"
+#include "transport/transport.h"
+
+namespace SsoClient::Testing {
+
+/// Records what is sent and answers each request with one text, or fails.
+class FakeTransport final : public Transport {
+ public:
+  explicit FakeTransport(std::string answer) : answer_(std::move(answer)) {}
+
+  std::shared_ptr<TransportSession> CreateSession() const override {
+    ++sessions;
+    return std::make_shared<Session>(*this);
+  }
+
+  mutable int sessions = 0;
+  mutable std::vector<std::string> actions;
+  mutable std::vector<std::string> bodies;
+  std::optional<CommunicationException> failure;
+
+ private:
+  class Session final : public TransportSession {
+   public:
+    explicit Session(const FakeTransport& transport) : transport_(transport) {}
+
+    void SendRequest(const SoapRequest& request,
+                     Tarnik::Ref<Tarnik::Reader>& reader) const override {
+      transport_.actions.push_back(request.action);
+      transport_.bodies.push_back(request.body);
+      if (transport_.failure) {
+        transport_.failure->Throw();
+      }
+      reader = Tarnik::CreateStringReader(transport_.answer_);
+    }
+
+    void SendRequestAsync(const SoapRequest&, const Completion&,
+                          Tarnik::Ref<Tarnik::Http::PendingRequestItem>&) const override {
+      FAIL() << "the service sends synchronously";
+    }
+
+   private:
+    const FakeTransport& transport_;
+  };
+
+  std::string answer_;
+};
+
+/// Makes a token of any text, or refuses all.
+class FakeTokenFactory final : public SamlTokenFactory {
+ public:
+  std::shared_ptr<const SamlToken> CreateToken(const std::string&) const override {
+    throw std::logic_error("the tolerance must be given");
+  }
+  std::shared_ptr<const SamlToken> CreateToken(const std::string& xml,
+                                               long clockToleranceSec) const override {
+    texts.push_back(xml);
+    tolerances.push_back(clockToleranceSec);
+    if (isRefusing) {
+      throw InvalidSignatureException("refused");
+    }
+    return std::make_shared<FakeSamlToken>(xml);
+  }
+  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
+    throw std::logic_error("the text must be given");
+  }
+  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*, long) const override {
+    throw std::logic_error("the text must be given");
+  }
+
+  bool isRefusing = false;
+  mutable std::vector<std::string> texts;
+  mutable std::vector<long> tolerances;
+};
+
+/// What a callback was given.
+struct Report {
+  std::shared_ptr<const SamlToken> token;
+  std::string errorType;
+  std::string message;
+};
+
+/// One asynchronous call to wait for.
+class AsyncCall {
+ public:
+  SecurityTokenService::TokenCallback Callback() {
+    return [promise = promise_](const std::shared_ptr<const SamlToken>& token,
+                                const Tarnik::Exception* error) {
+      promise->set_value({token, error != nullptr ? typeid(*error).name() : "",
+                          error != nullptr ? error->Message() : ""});
+    };
+  }
+  Report Wait() { return promise_->get_future().get(); }
+
+ private:
+  std::shared_ptr<std::promise<Report>> promise_ = std::make_shared<std::promise<Report>>();
+};
+
+}  // namespace SsoClient::Testing
+
+#endif

@@ -1,0 +1,281 @@
+#include <gmock/gmock.h>
+#include <tarnik/core/exception.h>
+
+#include <string>
+
+#include "describe/describe.h"
+#include "sts/answers.h"
+#include "sts/fakes.h"
+#include "sts/log_capture.h"
+#include "sts/request_builder_impl.h"
+#include "sts/response_handler_impl.h"
+#include "sts/security_token_service_impl.h"
+#include "support/holder_of_key.h"
+#include "support/vtable_slot.h"
+
+namespace SsoClient {
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+
+std::string IssueAnswer() {
+  return Testing::Envelope(
+      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
+}
+
+std::string RenewAnswer() {
+  return Testing::Envelope(Testing::Rstr(Testing::Requested(Testing::kAssertionXml)));
+}
+
+std::string StatusAnswer(const std::string& code) {
+  return Testing::Envelope(Testing::Rstr(
+      "<wst:Status><wst:Code>http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/" + code +
+      "</wst:Code></wst:Status>"));
+}
+
+TokenSpec OneHour() {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 3600;
+  return spec;
+}
+
+Testing::FakeSamlToken Presented() {
+  Testing::FakeSamlToken token("<Presented ID=\"_1\"/>");
+  token.id = "_1";
+  token.confirmationType = HOLDER_OF_KEY;
+  return token;
+}
+
+class Sts {
+ public:
+  explicit Sts(const std::string& answer)
+      : transport(std::make_shared<Testing::FakeTransport>(answer)) {}
+
+  std::shared_ptr<const SecurityTokenService> Service() const {
+    return std::make_shared<SecurityTokenServiceImpl>(
+        std::make_shared<RequestBuilderImpl>(Testing::ConfigOf(Testing::KeyCredential())),
+        transport, std::make_shared<ResponseHandlerImpl>(), factory);
+  }
+
+  std::shared_ptr<Testing::FakeTransport> transport;
+  std::shared_ptr<Testing::FakeTokenFactory> factory =
+      std::make_shared<Testing::FakeTokenFactory>();
+};
+
+std::string Start(const std::string& name) {
+  return "7 START operation SecurityTokenServiceImpl::" + name;
+}
+
+std::string End(const std::string& name) {
+  return "7 END operation SecurityTokenServiceImpl::" + name;
+}
+
+std::string Success(const SamlToken& token) {
+  return "5 Successfully acquired token: " + CreateSamlTokenDescription(token);
+}
+
+TEST(HolderOfKeyOperationsTest, ByCertificateIsTraced) {
+  const Sts sts(IssueAnswer());
+  const Testing::LogCapture log(7);
+  const auto token = sts.Service()->AcquireTokenByCertificate(OneHour());
+  ASSERT_NE(token, nullptr);
+  EXPECT_EQ(token->Xml(), Testing::kCanonicalAssertion);
+  EXPECT_THAT(sts.factory->tolerances, ElementsAre(600));
+  EXPECT_THAT(log.Lines(), ElementsAre(Start("AcquireTokenByCertificate"),
+                                       "7 Requested token with spec `" + Describe(OneHour()) + "'",
+                                       Success(*token), End("AcquireTokenByCertificate")));
+}
+
+TEST(HolderOfKeyOperationsTest, ByTokenIsTraced) {
+  const Sts sts(IssueAnswer());
+  const Testing::LogCapture log(7);
+  const auto presented = Presented();
+  const auto token = sts.Service()->AcquireTokenByToken(presented, OneHour());
+  ASSERT_NE(token, nullptr);
+  EXPECT_THAT(sts.transport->bodies.front(), HasSubstr("<Presented ID=\"_1\"/>"));
+  EXPECT_THAT(log.Lines(),
+              ElementsAre(Start("AcquireTokenByToken"),
+                          "7 Requested token for " + CreateSamlTokenDescription(presented) +
+                              " with spec `" + Describe(OneHour()) + "'",
+                          Success(*token), End("AcquireTokenByToken")));
+}
+
+TEST(HolderOfKeyOperationsTest, RenewalIsTraced) {
+  const Sts sts(RenewAnswer());
+  const Testing::LogCapture log(7);
+  const auto presented = Presented();
+  const auto token = sts.Service()->RenewToken(presented, 90);
+  ASSERT_NE(token, nullptr);
+  EXPECT_THAT(sts.factory->tolerances, ElementsAre(600));
+  EXPECT_THAT(log.Lines(), ElementsAre(Start("RenewToken"),
+                                       "7 Renewing token " + CreateSamlTokenDescription(presented) +
+                                           " for 90 more seconds",
+                                       Success(*token), End("RenewToken")));
+}
+
+TEST(HolderOfKeyOperationsTest, ValidationIsTracedAndGivesTheVerdict) {
+  for (const bool isValid : {true, false}) {
+    const Sts sts(StatusAnswer(isValid ? "valid" : "invalid"));
+    const Testing::LogCapture log(7);
+    const auto presented = Presented();
+    EXPECT_EQ(sts.Service()->ValidateSubject(presented), isValid);
+    EXPECT_THAT(sts.factory->texts, IsEmpty());
+    EXPECT_THAT(
+        log.Lines(),
+        ElementsAre(Start("ValidateSubject"),
+                    "7 Validating subject of token " + CreateSamlTokenDescription(presented),
+                    isValid ? "7 Result: true" : "7 Result: false", End("ValidateSubject")));
+  }
+}
+
+TEST(HolderOfKeyOperationsTest, TheEndIsLoggedWhenAnOperationFails) {
+  Sts sts(IssueAnswer());
+  sts.transport->failure.emplace("broken");
+  const auto service = sts.Service();
+  const auto presented = Presented();
+  const auto lastLine = [](const std::function<void()>& operation) {
+    const Testing::LogCapture log(7);
+    EXPECT_THROW(operation(), CommunicationException);
+    return log.Lines().back();
+  };
+  EXPECT_EQ(lastLine([&] { service->AcquireTokenByCertificate(OneHour()); }),
+            End("AcquireTokenByCertificate"));
+  EXPECT_EQ(lastLine([&] { service->AcquireTokenByToken(presented, OneHour()); }),
+            End("AcquireTokenByToken"));
+  EXPECT_EQ(lastLine([&] { service->RenewToken(presented, 60); }), End("RenewToken"));
+  EXPECT_EQ(lastLine([&] { service->ValidateSubject(presented); }), End("ValidateSubject"));
+}
+
+TEST(HolderOfKeyOperationsTest, ArgumentErrorsComeBeforeAnythingIsSent) {
+  const Sts sts(IssueAnswer());
+  const auto service = sts.Service();
+  auto bearer = Presented();
+  bearer.confirmationType = BEARER;
+  EXPECT_THROW(service->AcquireTokenByCertificate(TokenSpec()), Tarnik::InvalidArgumentException);
+  EXPECT_THROW(service->AcquireTokenByToken(bearer, TokenSpec()), Tarnik::InvalidArgumentException);
+  EXPECT_THROW(service->RenewToken(bearer, 60), Tarnik::InvalidArgumentException);
+  EXPECT_EQ(sts.transport->sessions, 0);
+}
+
+TEST(HolderOfKeyOperationsAsyncTest, TwinsGiveTokens) {
+  const Sts issuing(IssueAnswer());
+  const Sts renewing(RenewAnswer());
+  const auto presented = Presented();
+  Testing::AsyncCall byCertificate;
+  Testing::AsyncCall byToken;
+  Testing::AsyncCall renewal;
+  // The services are released at once.
+  issuing.Service()->AcquireTokenByCertificateAsync(OneHour(), byCertificate.Callback());
+  issuing.Service()->AcquireTokenByTokenAsync(presented, OneHour(), byToken.Callback());
+  renewing.Service()->RenewTokenAsync(presented, 60, renewal.Callback());
+  for (auto* call : {&byCertificate, &byToken, &renewal}) {
+    const auto report = call->Wait();
+    EXPECT_EQ(report.errorType, "");
+    EXPECT_NE(report.token, nullptr);
+  }
+}
+
+TEST(HolderOfKeyOperationsAsyncTest, TwinsReportErrorsWithTheirClass) {
+  const Sts sts(IssueAnswer());
+  auto bearer = Presented();
+  bearer.confirmationType = BEARER;
+  Testing::AsyncCall renewal;
+  sts.Service()->RenewTokenAsync(bearer, 60, renewal.Callback());
+  const auto report = renewal.Wait();
+  EXPECT_EQ(report.errorType, typeid(Tarnik::InvalidArgumentException).name());
+  EXPECT_EQ(report.message, "Unable to renew token: the provided token must be Holder Of Key");
+}
+
+struct Verdict {
+  boost::optional<bool> isValid;
+  std::string error;
+};
+
+Verdict ValidateAsync(const Sts& sts) {
+  const auto presented = Presented();
+  auto promise = std::make_shared<std::promise<Verdict>>();
+  sts.Service()->ValidateSubjectAsync(
+      presented, [promise](const boost::optional<bool>& isValid, const Tarnik::Exception* error) {
+        promise->set_value({isValid, error != nullptr ? typeid(*error).name() : ""});
+      });
+  return promise->get_future().get();
+}
+
+TEST(HolderOfKeyOperationsAsyncTest, ValidationReportsAVerdictOrNone) {
+  for (const bool isValid : {true, false}) {
+    const auto verdict = ValidateAsync(Sts(StatusAnswer(isValid ? "valid" : "invalid")));
+    EXPECT_TRUE(verdict.isValid == isValid);
+    EXPECT_EQ(verdict.error, "");
+  }
+  const auto verdict = ValidateAsync(Sts("no answer"));
+  EXPECT_FALSE(verdict.isValid.has_value());
+  EXPECT_EQ(verdict.error, typeid(SsoException).name());
+}
+
+TEST(HolderOfKeyOperationsAsyncTest, EmptyCallbacksAreRefusedAtTheCall) {
+  const Sts sts(IssueAnswer());
+  const auto service = sts.Service();
+  const auto presented = Presented();
+  EXPECT_THROW(service->AcquireTokenByCertificateAsync(OneHour(), nullptr),
+               Tarnik::InvalidArgumentException);
+  EXPECT_THROW(service->AcquireTokenByTokenAsync(presented, OneHour(), nullptr),
+               Tarnik::InvalidArgumentException);
+  EXPECT_THROW(service->ValidateSubjectAsync(presented, nullptr), Tarnik::InvalidArgumentException);
+  EXPECT_THROW(service->RenewTokenAsync(presented, 60, nullptr), Tarnik::InvalidArgumentException);
+}
+
+TEST(HolderOfKeyOperationsTest, OperationsStandInTheirOrder) {
+  using TestSupport::VtableSlot;
+  using Token = std::shared_ptr<const SamlToken>;
+  using Callback = SecurityTokenService::TokenCallback;
+  const Sts sts(IssueAnswer());
+  const auto service = sts.Service();
+  const SecurityTokenService* object = service.get();
+  const auto presented = Presented();
+  const Testing::LogCapture log(7);
+  const auto lastOperation = [&] { return log.Lines().back(); };
+  VtableSlot<Token(const void*, const TokenSpec&)>(object, 1)(object, OneHour());
+  EXPECT_EQ(lastOperation(), End("AcquireTokenByCertificate"));
+  VtableSlot<Token(const void*, const SamlToken&, const TokenSpec&)>(object, 2)(object, presented,
+                                                                                OneHour());
+  EXPECT_EQ(lastOperation(), End("AcquireTokenByToken"));
+  EXPECT_THROW((VtableSlot<bool(const void*, const SamlToken&)>(object, 3)(object, presented)),
+               SsoException);
+  EXPECT_EQ(lastOperation(), End("ValidateSubject"));
+  EXPECT_THROW((VtableSlot<Token(const void*, const SamlToken&, std::int64_t)>(object, 4)(
+                   object, presented, 60)),
+               SsoException);
+  EXPECT_EQ(lastOperation(), End("RenewToken"));
+  Testing::AsyncCall byCertificate;
+  VtableSlot<void(const void*, const TokenSpec&, Callback)>(object, 6)(object, OneHour(),
+                                                                       byCertificate.Callback());
+  EXPECT_NE(byCertificate.Wait().token, nullptr);
+  Testing::AsyncCall byToken;
+  VtableSlot<void(const void*, const SamlToken&, const TokenSpec&, Callback)>(object, 7)(
+      object, presented, OneHour(), byToken.Callback());
+  EXPECT_NE(byToken.Wait().token, nullptr);
+  std::promise<std::string> verdict;
+  VtableSlot<void(const void*, const SamlToken&, SecurityTokenService::ValidateCallback)>(
+      object, 8)(object, presented,
+                 [&verdict](const boost::optional<bool>&, const Tarnik::Exception* error) {
+                   verdict.set_value(typeid(*error).name());
+                 });
+  EXPECT_EQ(verdict.get_future().get(), typeid(SsoException).name());
+  Testing::AsyncCall renewal;
+  VtableSlot<void(const void*, const SamlToken&, std::int64_t, Callback)>(object, 9)(
+      object, presented, 60, renewal.Callback());
+  EXPECT_EQ(renewal.Wait().errorType, typeid(SsoException).name());
+}
+
+TEST(HolderOfKeyOperationsTest, NothingSecretIsLogged) {
+  const Sts sts(IssueAnswer());
+  const Testing::LogCapture log(9);
+  sts.Service()->AcquireTokenByToken(Presented(), OneHour());
+  EXPECT_THAT(log.Lines(), testing::Each(Not(HasSubstr("<Presented"))));
+}
+
+}  // namespace
+}  // namespace SsoClient

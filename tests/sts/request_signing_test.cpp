@@ -1,0 +1,345 @@
+#include <devsts/xml_security.h>
+#include <gmock/gmock.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/xml/xml_parse_exception.h>
+
+#include <chrono>
+#include <functional>
+#include <string>
+
+#include "sts/request_builder_impl.h"
+#include "support/fake_saml_token.h"
+#include "support/holder_of_key.h"
+#include "support/parse_xml.h"
+#include "support/thrown_message.h"
+#include "support/vtable_slot.h"
+#include "xml/built_xml.h"
+
+namespace SsoClient {
+namespace {
+
+using namespace std::chrono_literals;
+using Tarnik::InvalidArgumentException;
+using Tarnik::InvalidStateException;
+using testing::HasSubstr;
+using testing::Not;
+using TestSupport::ThrownMessage;
+
+constexpr char kIssueAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
+constexpr char kRenewAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Renew";
+constexpr char kValidateAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Validate";
+
+constexpr char kTimestamp[] = "wsu:Timestamp";
+constexpr char kUsername[] = "wsse:UsernameToken";
+constexpr char kCertificate[] = "wsse:BinarySecurityToken";
+constexpr char kAssertion[] = "Assertion";
+constexpr char kSignature[] = "ds:Signature";
+
+const DevSts::Credential& Credential() {
+  static const DevSts::Credential credential = Testing::KeyCredential();
+  return credential;
+}
+
+RequestBuilderImpl BuilderWithKey() {
+  return RequestBuilderImpl(Testing::ConfigOf(Credential()));
+}
+
+Testing::FakeSamlToken PresentedToken(TokenConfirmationType confirmation = HOLDER_OF_KEY) {
+  Testing::FakeSamlToken token("<Assertion ID=\"_presented\"/>");
+  token.id = "_presented";
+  token.confirmationType = confirmation;
+  return token;
+}
+
+TokenSpec SpecOf(std::int64_t seconds, ConfirmationType confirmation = CONFIRMATION_DEFAULT,
+                 bool isActingAs = false) {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = seconds;
+  spec.confirmation = confirmation;
+  if (isActingAs) {
+    spec.actAsToken = std::make_shared<Testing::FakeSamlToken>("<ActsAs ID=\"_other\"/>");
+  }
+  return spec;
+}
+
+using Operation = std::function<void(const RequestBuilderImpl&, const TokenSpec&, SoapRequest&)>;
+
+void ByPassword(const RequestBuilderImpl& builder, const TokenSpec& spec, SoapRequest& request) {
+  builder.BuildAcquireTokenRequest("alice", "pw", spec, request);
+}
+void ByCertificate(const RequestBuilderImpl& builder, const TokenSpec& spec, SoapRequest& request) {
+  builder.BuildAcquireTokenByCertificateRequest(spec, request);
+}
+void ByToken(const RequestBuilderImpl& builder, const TokenSpec& spec, SoapRequest& request) {
+  builder.BuildAcquireTokenByTokenRequest(PresentedToken(), spec, request);
+}
+void Validate(const RequestBuilderImpl& builder, const TokenSpec&, SoapRequest& request) {
+  builder.BuildValidateRequest(PresentedToken(), request);
+}
+void Renew(const RequestBuilderImpl& builder, const TokenSpec& spec, SoapRequest& request) {
+  builder.BuildRenewRequest(PresentedToken(), spec.tokenLifetimeSec, request);
+}
+
+std::vector<std::string> HeaderOf(const std::string& envelope) {
+  const auto document = Testing::ParseXml(envelope);
+  const auto* security =
+      document->RootElement()->FirstChildElement("Header")->FirstChildElement("Security");
+  std::vector<std::string> names;
+  for (auto* node = security->FirstChild(); node != nullptr; node = node->NextSibling()) {
+    names.emplace_back(static_cast<const Tarnik::Xml::ElementNode*>(node)->QualifiedNameText());
+  }
+  return names;
+}
+
+// What a request is to be; an error message instead of a header when it is refused.
+struct SigningCase {
+  const char* name;
+  Operation operation;
+  bool hasKey;
+  ConfirmationType confirmation;
+  bool isActingAs;
+  std::vector<std::string> header;
+  const char* keyType;  // null: none in the body
+  bool hasUseKey;
+  const char* refusal = nullptr;
+};
+
+constexpr char kPublicKey[] = "PublicKey";
+constexpr char kBearer[] = "Bearer";
+constexpr char kNoKeyForCertificate[] =
+    "No HolderOfKeyConfig provided. Unable to acquire token by certificate";
+constexpr char kNoKeyForToken[] = "No HolderOfKeyConfig provided. Unable to acquire token by token";
+constexpr char kNoKeyForRenewal[] = "No HolderOfKeyConfig provided. Unable to renew token";
+constexpr char kNotDefault[] =
+    "TokenSpec::confirmation must be CONFIRMATION_DEFAULT for acquire token by certificate";
+constexpr auto kDefault = CONFIRMATION_DEFAULT;
+constexpr auto kOther = CONFIRMATION_BEARER;
+
+const std::vector<std::string> kPlainPassword{kTimestamp, kUsername};
+const std::vector<std::string> kSignedPassword{kTimestamp, kUsername, kCertificate, kSignature};
+const std::vector<std::string> kByCertificate{kTimestamp, kCertificate, kSignature};
+const std::vector<std::string> kByToken{kTimestamp, kAssertion, kSignature};
+const std::vector<std::string> kPlain{kTimestamp};
+
+class RequestSigningTest : public testing::TestWithParam<SigningCase> {};
+
+std::string Refusal(const SigningCase& tested, const RequestBuilderImpl& builder,
+                    const TokenSpec& spec) {
+  SoapRequest request;
+  const auto message =
+      tested.hasKey
+          ? ThrownMessage<InvalidArgumentException>(
+                [&] { tested.operation(builder, spec, request); })
+          : ThrownMessage<InvalidStateException>([&] { tested.operation(builder, spec, request); });
+  EXPECT_EQ(request.body, "");
+  EXPECT_EQ(request.action, "");
+  return message;
+}
+
+TEST_P(RequestSigningTest, IsDecidedByKeyConfirmationActAsTokenAndOperation) {
+  const auto& tested = GetParam();
+  const auto builder = tested.hasKey ? BuilderWithKey() : RequestBuilderImpl(boost::none);
+  const auto spec = SpecOf(60, tested.confirmation, tested.isActingAs);
+  if (tested.refusal != nullptr) {
+    EXPECT_EQ(Refusal(tested, builder, spec), tested.refusal);
+    return;
+  }
+  SoapRequest request;
+  tested.operation(builder, spec, request);
+  EXPECT_EQ(HeaderOf(request.body), tested.header);
+  const std::string keyType = tested.keyType == nullptr
+                                  ? "wst:KeyType"
+                                  : std::string("/") + tested.keyType + "</wst:KeyType>";
+  EXPECT_EQ(request.body.find(keyType) != std::string::npos, tested.keyType != nullptr);
+  EXPECT_EQ(
+      request.body.find("<wst:UseKey Sig=\"holderOfKeyProofSignature\"/>") != std::string::npos,
+      tested.hasUseKey);
+  if (tested.header.back() == kSignature) {
+    const auto verdict = DevSts::VerifyXml(request.body, Credential().certificatePem);
+    EXPECT_TRUE(verdict.valid) << verdict.reason;
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Requests, RequestSigningTest,
+    testing::Values(
+        SigningCase{"PasswordNoKey", ByPassword, false, kDefault, false, kPlainPassword, kBearer,
+                    false},
+        SigningCase{"PasswordNoKeyBearer", ByPassword, false, kOther, false, kPlainPassword,
+                    kBearer, false},
+        SigningCase{"PasswordNoKeyActAs", ByPassword, false, kDefault, true, kPlainPassword,
+                    kBearer, false},
+        SigningCase{"PasswordNoKeyBearerActAs", ByPassword, false, kOther, true, kPlainPassword,
+                    kBearer, false},
+        SigningCase{"Password", ByPassword, true, kDefault, false, kSignedPassword, kPublicKey,
+                    true},
+        SigningCase{"PasswordBearer", ByPassword, true, kOther, false, kPlainPassword, kBearer,
+                    false},
+        SigningCase{"PasswordActAs", ByPassword, true, kDefault, true, kPlainPassword, kPublicKey,
+                    true},
+        SigningCase{"PasswordBearerActAs", ByPassword, true, kOther, true, kPlainPassword, kBearer,
+                    false},
+        SigningCase{"CertificateNoKey",
+                    ByCertificate,
+                    false,
+                    kDefault,
+                    false,
+                    {},
+                    nullptr,
+                    false,
+                    kNoKeyForCertificate},
+        SigningCase{"CertificateNoKeyBearer",
+                    ByCertificate,
+                    false,
+                    kOther,
+                    false,
+                    {},
+                    nullptr,
+                    false,
+                    kNoKeyForCertificate},
+        SigningCase{"Certificate", ByCertificate, true, kDefault, false, kByCertificate, kPublicKey,
+                    true},
+        SigningCase{"CertificateActAs", ByCertificate, true, kDefault, true, kByCertificate,
+                    kPublicKey, true},
+        SigningCase{"CertificateBearer",
+                    ByCertificate,
+                    true,
+                    kOther,
+                    false,
+                    {},
+                    nullptr,
+                    false,
+                    kNotDefault},
+        SigningCase{"CertificateBearerActAs",
+                    ByCertificate,
+                    true,
+                    kOther,
+                    true,
+                    {},
+                    nullptr,
+                    false,
+                    kNotDefault},
+        SigningCase{
+            "TokenNoKey", ByToken, false, kDefault, false, {}, nullptr, false, kNoKeyForToken},
+        SigningCase{"Token", ByToken, true, kDefault, false, kByToken, kPublicKey, false},
+        SigningCase{"TokenActAs", ByToken, true, kDefault, true, kByToken, kPublicKey, false},
+        SigningCase{"TokenBearer", ByToken, true, kOther, false, kByToken, kBearer, false},
+        SigningCase{"TokenBearerActAs", ByToken, true, kOther, true, kByToken, kBearer, false},
+        SigningCase{"ValidateNoKey", Validate, false, kDefault, false, kPlain, nullptr, false},
+        SigningCase{"Validate", Validate, true, kDefault, false, kPlain, nullptr, false},
+        SigningCase{
+            "RenewNoKey", Renew, false, kDefault, false, {}, nullptr, false, kNoKeyForRenewal},
+        SigningCase{"Renew", Renew, true, kDefault, false, kByCertificate, nullptr, false}),
+    [](const auto& tested) { return tested.param.name; });
+
+TEST(RequestSigningActionTest, EachOperationHasItsAction) {
+  const auto builder = BuilderWithKey();
+  const auto action = [&](const Operation& operation) {
+    SoapRequest request;
+    operation(builder, SpecOf(60), request);
+    return request.action;
+  };
+  EXPECT_EQ(action(ByPassword), kIssueAction);
+  EXPECT_EQ(action(ByCertificate), kIssueAction);
+  EXPECT_EQ(action(ByToken), kIssueAction);
+  EXPECT_EQ(action(Validate), kValidateAction);
+  EXPECT_EQ(action(Renew), kRenewAction);
+}
+
+TEST(RequestSigningOrderTest, TheLifetimeIsJudgedFirst) {
+  for (const bool hasKey : {false, true}) {
+    const auto builder = hasKey ? BuilderWithKey() : RequestBuilderImpl(boost::none);
+    for (const Operation& operation :
+         {Operation(ByPassword), Operation(ByCertificate), Operation(ByToken), Operation(Renew)}) {
+      for (const std::int64_t seconds : {0, -1}) {
+        SoapRequest request;
+        EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
+                      [&] { operation(builder, SpecOf(seconds, CONFIRMATION_BEARER), request); }),
+                  "Token lifetime must be positive");
+      }
+    }
+  }
+}
+
+TEST(RequestSigningOrderTest, ABearerTokenIsNotRenewedWhateverTheKey) {
+  SoapRequest request;
+  EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
+                [&] { BuilderWithKey().BuildRenewRequest(PresentedToken(BEARER), 60, request); }),
+            "Unable to renew token: the provided token must be Holder Of Key");
+  EXPECT_EQ(
+      ThrownMessage<InvalidStateException>([&] {
+        RequestBuilderImpl(boost::none).BuildRenewRequest(PresentedToken(BEARER), 60, request);
+      }),
+      kNoKeyForRenewal);
+}
+
+TEST(RequestSigningOrderTest, TheConfirmationOfAPresentedTokenIsNotExamined) {
+  SoapRequest request;
+  BuilderWithKey().BuildAcquireTokenByTokenRequest(PresentedToken(BEARER), SpecOf(60), request);
+  EXPECT_THAT(HeaderOf(request.body), testing::ElementsAre(kTimestamp, kAssertion, kSignature));
+}
+
+TEST(RequestSigningTokenTest, TheSignatureNamesThePresentedToken) {
+  SoapRequest request;
+  ByToken(BuilderWithKey(), SpecOf(60), request);
+  EXPECT_THAT(request.body, HasSubstr("#SAMLID\">_presented</wsse:KeyIdentifier>"));
+  EXPECT_THAT(request.body, HasSubstr("<Assertion ID=\"_presented\"/>"));
+}
+
+TEST(RequestSigningTokenTest, AMalformedTokenTextLeavesTheRequestAsItWas) {
+  const Testing::FakeSamlToken broken("<A>");
+  SoapRequest request;
+  EXPECT_THROW(BuilderWithKey().BuildValidateRequest(broken, request),
+               Tarnik::Xml::XMLParseException);
+  EXPECT_THROW(BuilderWithKey().BuildAcquireTokenByTokenRequest(broken, SpecOf(60), request),
+               Tarnik::Xml::XMLParseException);
+  EXPECT_EQ(request.body, "");
+}
+
+TEST(RequestSigningDelegationTest, ADelegatedTokenIsSignedForWithoutUseKey) {
+  auto spec = SpecOf(60);
+  spec.delegateTo = "bob";
+  SoapRequest request;
+  ByCertificate(BuilderWithKey(), spec, request);
+  EXPECT_THAT(HeaderOf(request.body), testing::ElementsAre(kTimestamp, kCertificate, kSignature));
+  EXPECT_THAT(request.body, HasSubstr("/PublicKey</wst:KeyType>"));
+  EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
+}
+
+TEST(RequestSigningCertificateTest, AnExpiredCertificateSignsNothing) {
+  const RequestBuilderImpl builder(
+      Testing::ConfigOf(Testing::KeyCredential(DevSts::KeyType::Rsa2048, -2h, -1h)));
+  for (const Operation& operation :
+       {Operation(ByPassword), Operation(ByCertificate), Operation(ByToken), Operation(Renew)}) {
+    SoapRequest request;
+    EXPECT_THAT(
+        ThrownMessage<InvalidStateException>([&] { operation(builder, SpecOf(60), request); }),
+        testing::StartsWith("The holder-of-key certificate of `CN=holder' expired at "));
+    EXPECT_EQ(request.body, "");
+  }
+  SoapRequest request;
+  ByPassword(builder, SpecOf(60, CONFIRMATION_BEARER), request);
+  EXPECT_NE(request.body, "");
+}
+
+TEST(RequestSigningLayoutTest, OperationsStandInTheirOrder) {
+  const auto builder = BuilderWithKey();
+  const RequestBuilder& object = builder;
+  SoapRequest request;
+  using BySpec = void(const void*, const TokenSpec&, SoapRequest&);
+  TestSupport::VtableSlot<BySpec>(&object, 1)(&object, SpecOf(60), request);
+  EXPECT_THAT(HeaderOf(request.body), testing::ElementsAre(kTimestamp, kCertificate, kSignature));
+  using ByTokenAndSpec = void(const void*, const SamlToken&, const TokenSpec&, SoapRequest&);
+  TestSupport::VtableSlot<ByTokenAndSpec>(&object, 2)(&object, PresentedToken(), SpecOf(60),
+                                                      request);
+  EXPECT_THAT(HeaderOf(request.body), testing::ElementsAre(kTimestamp, kAssertion, kSignature));
+  using Validating = void(const void*, const SamlToken&, SoapRequest&);
+  TestSupport::VtableSlot<Validating>(&object, 3)(&object, PresentedToken(), request);
+  EXPECT_EQ(request.action, kValidateAction);
+  using Renewing = void(const void*, const SamlToken&, std::int64_t, SoapRequest&);
+  TestSupport::VtableSlot<Renewing>(&object, 4)(&object, PresentedToken(), 60, request);
+  EXPECT_EQ(request.action, kRenewAction);
+}
+
+}  // namespace
+}  // namespace SsoClient

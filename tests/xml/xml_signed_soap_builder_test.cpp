@@ -1,0 +1,189 @@
+#include "xml/xml_signed_soap_builder.h"
+
+#include <devsts/xml_security.h>
+#include <gmock/gmock.h>
+#include <tarnik/xml/security/signature.h>
+#include <tarnik/xml/security/xml_security_exception.h>
+
+#include "support/holder_of_key.h"
+#include "support/vtable_slot.h"
+#include "xml/builder_factories.h"
+#include "xml/built_xml.h"
+#include "xml/namespaces.h"
+#include "xml/security_header.h"
+#include "xml/signed_soap_builders.h"
+
+namespace SsoClient {
+namespace {
+
+using Tarnik::Ref;
+using Tarnik::Xml::ElementNode;
+using testing::ElementsAre;
+
+const DevSts::Credential& Credential() {
+  static const DevSts::Credential credential = Testing::KeyCredential();
+  return credential;
+}
+
+std::shared_ptr<XMLBaseBuilder> Body() {
+  return MakeTextElementBuilder("", "Body", "text");
+}
+
+std::shared_ptr<XMLSignedSoapBuilder> CertificateForm() {
+  const auto config = Testing::ConfigOf(Credential());
+  return MakeSignedSoapBuilderForCertificate(BuildSecurityHeader(10), Body(), config.privateKey,
+                                             *config.certificate);
+}
+
+const ElementNode& At(const ElementNode& root, std::initializer_list<std::string_view> path) {
+  const ElementNode* current = &root;
+  for (const auto name : path) {
+    current = current->FirstChildElement(name);
+    if (current == nullptr) {
+      throw std::runtime_error("no element " + std::string(name));
+    }
+  }
+  return *current;
+}
+
+std::vector<std::string> ChildNames(const ElementNode& element) {
+  std::vector<std::string> names;
+  for (auto* node = element.FirstChild(); node != nullptr; node = node->NextSibling()) {
+    names.emplace_back(static_cast<const ElementNode*>(node)->QualifiedNameText());
+  }
+  return names;
+}
+
+std::string IdOf(const ElementNode& element) {
+  return std::string(element.FindAttribute(kWsuNamespace, "Id").value_or("none"));
+}
+
+Ref<Tarnik::Xml::Security::Signature> SignatureOf(const ElementNode& envelope) {
+  return Tarnik::Xml::Security::CreateSignatureFromDom(
+      At(envelope, {"Header", "Security"}).FirstChildElement("Signature"));
+}
+
+TEST(XMLSignedSoapBuilderTest, SignsTheBodyAndThenTheTimestamp) {
+  const auto envelope = Testing::Built(*CertificateForm());
+  const auto signature = SignatureOf(*envelope);
+  EXPECT_EQ(signature->SignatureMethod(), "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256");
+  EXPECT_EQ(signature->CanonicalizationMethod(), "http://www.w3.org/2001/10/xml-exc-c14n#");
+  ASSERT_EQ(signature->References().size(), 2U);
+  EXPECT_EQ(signature->References()[0].uri, "#" + IdOf(At(*envelope, {"Body"})));
+  EXPECT_EQ(signature->References()[1].uri,
+            "#" + IdOf(At(*envelope, {"Header", "Security", "Timestamp"})));
+  for (const auto& reference : signature->References()) {
+    EXPECT_EQ(reference.digestMethod, "http://www.w3.org/2001/04/xmlenc#sha256");
+    EXPECT_THAT(reference.transforms, ElementsAre("http://www.w3.org/2001/10/xml-exc-c14n#"));
+  }
+}
+
+TEST(XMLSignedSoapBuilderTest, TheWrittenRequestVerifiesElsewhere) {
+  const auto text = Testing::BuiltXml(*CertificateForm());
+  const auto verdict = DevSts::VerifyXml(text, Credential().certificatePem);
+  EXPECT_TRUE(verdict.valid) << verdict.reason;
+  auto changed = text;
+  changed.replace(changed.find(">text<"), 6, ">next<");
+  EXPECT_FALSE(DevSts::VerifyXml(changed, Credential().certificatePem).valid);
+}
+
+TEST(XMLSignedSoapBuilderTest, TheSignatureIsTheLastOfTheHeaderAndBearsItsId) {
+  const auto envelope = Testing::Built(*CertificateForm());
+  const auto& security = At(*envelope, {"Header", "Security"});
+  EXPECT_THAT(ChildNames(security),
+              ElementsAre("wsu:Timestamp", "wsse:BinarySecurityToken", "ds:Signature"));
+  EXPECT_EQ(At(security, {"Signature"}).FindAttribute("Id"), "holderOfKeyProofSignature");
+}
+
+TEST(XMLSignedSoapBuilderTest, TheCertificateFormRefersToTheCertificateInTheHeader) {
+  const auto envelope = Testing::Built(*CertificateForm());
+  EXPECT_EQ(IdOf(At(*envelope, {"Header", "Security", "BinarySecurityToken"})),
+            "holderOfKeyCertificate");
+  EXPECT_EQ(
+      Testing::XmlText(At(*envelope, {"Header", "Security", "Signature", "KeyInfo"}).FirstChild()),
+      "<wsse:SecurityTokenReference xmlns:wsse=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-wssecurity-secext-1.0.xsd\">"
+      "<wsse:Reference URI=\"#holderOfKeyCertificate\""
+      " ValueType=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-x509-token-profile-1.0#X509v3\"/></wsse:SecurityTokenReference>");
+}
+
+TEST(XMLSignedSoapBuilderTest, TheTokenFormRefersToTheAssertion) {
+  const auto header = BuildSecurityHeader(10);
+  header->Add(MakeElementBuilder("", "Assertion", {{"ID", "_1"}}));
+  const auto config = Testing::ConfigOf(Credential());
+  const auto envelope =
+      Testing::Built(*MakeSignedSoapBuilderForToken(header, Body(), config.privateKey, "_1"));
+  EXPECT_THAT(ChildNames(At(*envelope, {"Header", "Security"})),
+              ElementsAre("wsu:Timestamp", "Assertion", "ds:Signature"));
+  const auto& identifier = At(*envelope, {"Header", "Security", "Signature", "KeyInfo",
+                                          "SecurityTokenReference", "KeyIdentifier"});
+  EXPECT_EQ(Testing::XmlText(identifier.FirstChild()), "_1");
+  const auto verdict =
+      DevSts::VerifyXml(Testing::XmlText(envelope.get()), Credential().certificatePem);
+  EXPECT_TRUE(verdict.valid) << verdict.reason;
+}
+
+TEST(XMLSignedSoapBuilderTest, NewIdsAreTheLocalNameAndAUuid) {
+  const auto envelope = Testing::Built(*CertificateForm());
+  const auto& timestamp = At(*envelope, {"Header", "Security", "Timestamp"});
+  EXPECT_THAT(IdOf(At(*envelope, {"Body"})), testing::MatchesRegex("Body[0-9a-f-]{36}"));
+  EXPECT_THAT(IdOf(timestamp), testing::MatchesRegex("Timestamp[0-9a-f-]{36}"));
+  // The declaration that is there already is not written twice.
+  EXPECT_EQ(timestamp.AttributeCount(), 2U);
+  const auto& body = At(*envelope, {"Body"});
+  EXPECT_EQ(body.AttributeAt(1).Name(), "xmlns:wsu");
+  EXPECT_EQ(body.AttributeAt(2).Name(), "wsu:Id");
+}
+
+TEST(XMLSignedSoapBuilderTest, AnElementKeepsTheIdThatItHas) {
+  auto security = MakeCompositeBuilder("wsse", "Security", {{"xmlns:wsse", kWsseNamespace}});
+  security->Add(
+      MakeElementBuilder("u", "Timestamp", {{"u:Id", "mine"}, {"xmlns:u", kWsuNamespace}}));
+  const XMLSignedSoapBuilder builder(security, Body(), Testing::ConfigOf(Credential()).privateKey,
+                                     nullptr);
+  const auto envelope = Testing::Built(builder);
+  const auto& timestamp = At(*envelope, {"Header", "Security", "Timestamp"});
+  EXPECT_EQ(timestamp.AttributeCount(), 2U);
+  EXPECT_EQ(SignatureOf(*envelope)->References()[1].uri, "#mine");
+}
+
+TEST(XMLSignedSoapBuilderTest, WithoutAKeyInfoBuilderThereIsNoKeyInfo) {
+  const XMLSignedSoapBuilder builder(BuildSecurityHeader(10), Body(),
+                                     Testing::ConfigOf(Credential()).privateKey, nullptr);
+  const auto envelope = Testing::Built(builder);
+  EXPECT_EQ(At(*envelope, {"Header", "Security", "Signature"}).FirstChildElement("KeyInfo"),
+            nullptr);
+}
+
+TEST(XMLSignedSoapBuilderTest, TwoBuildsDifferInIdsAndSignaturesAndBothVerify) {
+  const auto builder = CertificateForm();
+  const auto first = Testing::Built(*builder);
+  const auto second = Testing::Built(*builder);
+  EXPECT_NE(IdOf(At(*first, {"Body"})), IdOf(At(*second, {"Body"})));
+  EXPECT_NE(IdOf(At(*first, {"Header", "Security", "Timestamp"})),
+            IdOf(At(*second, {"Header", "Security", "Timestamp"})));
+  const auto value = [](const ElementNode& envelope) {
+    return Testing::XmlText(&At(envelope, {"Header", "Security", "Signature", "SignatureValue"}));
+  };
+  EXPECT_NE(value(*first), value(*second));
+  for (const auto& envelope : {first, second}) {
+    const auto verdict =
+        DevSts::VerifyXml(Testing::XmlText(envelope.get()), Credential().certificatePem);
+    EXPECT_TRUE(verdict.valid) << verdict.reason;
+  }
+}
+
+TEST(XMLSignedSoapBuilderTest, AKeyThatCannotSignLeavesAnEnvelopeWithoutASignature) {
+  const auto config = Testing::ConfigOf(Testing::KeyCredential(DevSts::KeyType::EcP256));
+  Ref<ElementNode> envelope;
+  EXPECT_THROW(MakeSignedSoapBuilderForCertificate(BuildSecurityHeader(10), Body(),
+                                                   config.privateKey, *config.certificate)
+                   ->Build(envelope),
+               Tarnik::Xml::Security::XmlSecurityException);
+  ASSERT_NE(envelope, nullptr);
+  EXPECT_EQ(At(*envelope, {"Header", "Security"}).FirstChildElement("Signature"), nullptr);
+}
+
+}  // namespace
+}  // namespace SsoClient
