@@ -1,8 +1,10 @@
 #include "crypto/key_context_pool.h"
 
+#include <openssl/provider.h>
 #include <openssl/rsa.h>
 
 #include <tarnik/crypto/crypto_exception.h>
+#include <string>
 #include <utility>
 
 #include "support/openssl_error.h"
@@ -12,6 +14,20 @@ namespace {
 
 // More threads than this may use one key at once; they then set up contexts of their own.
 constexpr std::size_t kMaxIdleContexts = 64;
+
+// A key may live in a device whose provider also hands out the public half. Any other provider
+// would take that half and then find that it cannot sign.
+std::string ProviderOf(const EVP_PKEY* key) {
+  const OSSL_PROVIDER* provider = EVP_PKEY_get0_provider(key);
+  return provider == nullptr ? ""
+                             : std::string("?provider='") + OSSL_PROVIDER_get0_name(provider) + "'";
+}
+
+OpenSsl::OwnedKeyContext NewContext(EVP_PKEY* key, KeyOperation operation) {
+  const std::string properties = operation == KeyOperation::kSign ? ProviderOf(key) : "";
+  return OpenSsl::OwnedKeyContext(
+      EVP_PKEY_CTX_new_from_pkey(nullptr, key, properties.empty() ? nullptr : properties.c_str()));
+}
 
 bool Begin(EVP_PKEY_CTX* context, KeyOperation operation) {
   return operation == KeyOperation::kSign ? EVP_PKEY_sign_init(context) == 1
@@ -47,7 +63,7 @@ OpenSsl::OwnedKeyContext KeyContextPool::Take(EVP_PKEY* key, SignatureScheme sch
     return idle;
   }
   const OpenSsl::ErrorScope errors;
-  OpenSsl::OwnedKeyContext context(EVP_PKEY_CTX_new_from_pkey(nullptr, key, nullptr));
+  OpenSsl::OwnedKeyContext context = NewContext(key, operation_);
   if (context == nullptr || !Begin(context.get(), operation_) ||
       !SetUp(context.get(), scheme, hash)) {
     throw CryptoException(errors.Describe(FailureOf(operation_)));

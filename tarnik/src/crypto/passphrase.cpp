@@ -36,7 +36,7 @@ const std::string& Passphrase::Get() {
 
 void Passphrase::Ask() {
   if (!callback_) {
-    throw CryptoException("The private key is encrypted, and no passphrase was given.");
+    throw CryptoException("The private key needs a passphrase, and none was given.");
   }
   // Short texts lie in the string itself, where a move would leave them.
   std::string given = callback_();

@@ -53,7 +53,7 @@ TEST(KeyStore, AsksOnceForThePassphraseOfAFile) {
 TEST(KeyStore, RefusesAnEncryptedFileWithoutThePassphrase) {
   const std::string secret = kSecret;
   const TemporaryFile file(ToPkcs8Pem(SharedRsaKey(), &secret));
-  EXPECT_EQ(LoadError(FileUri(file)), "The private key is encrypted, and no passphrase was given.");
+  EXPECT_EQ(LoadError(FileUri(file)), "The private key needs a passphrase, and none was given.");
   int asked = 0;
   const std::string wrong = LoadError(FileUri(file), [&] {
     ++asked;

@@ -109,7 +109,7 @@ class EncryptedPrivateKey : public testing::TestWithParam<Form> {
 };
 
 TEST_P(EncryptedPrivateKey, IsRefusedWithoutAPassphrase) {
-  EXPECT_EQ(LoadError(Pem()), "The private key is encrypted, and no passphrase was given.");
+  EXPECT_EQ(LoadError(Pem()), "The private key needs a passphrase, and none was given.");
 }
 
 TEST_P(EncryptedPrivateKey, IsRefusedWithAWrongPassphraseThatIsAskedForOnce) {

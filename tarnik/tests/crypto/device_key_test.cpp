@@ -1,0 +1,74 @@
+#include <gtest/gtest.h>
+
+#include <tarnik/crypto/private_key.h>
+#include <memory>
+#include <string>
+
+#include "support/software_tpm.h"
+
+namespace Tarnik::Crypto {
+namespace {
+
+using Testing::SoftwareTpm;
+
+constexpr const char* kPin = "4711";
+constexpr const char* kRsaKey = "handle:0x81000001?pass";
+constexpr const char* kEcKey = "handle:0x81000002?pass";
+constexpr const char* kRsaSha256 = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
+constexpr const char* kEcdsaSha256 = "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha256";
+
+/// Keys in a TPM, through OpenSSL's provider for it.
+class DeviceKey : public testing::Test {
+ protected:
+  static void SetUpTestSuite() {
+    if (!SoftwareTpm::IsInstalled()) {
+      return;
+    }
+    const std::string attributes = "fixedtpm|fixedparent|sensitivedataorigin|userwithauth|sign";
+    tpm_ = std::make_unique<SoftwareTpm>();
+    tpm_->MakeKey("rsa2048", attributes + "|decrypt", kPin, "0x81000001");
+    tpm_->MakeKey("ecc256", attributes, kPin, "0x81000002");
+  }
+  static void TearDownTestSuite() { tpm_.reset(); }
+
+  void SetUp() override {
+    if (tpm_ == nullptr) {
+      GTEST_SKIP() << "swtpm and tpm2-tools are not installed";
+    }
+  }
+
+  static std::string Sign(const std::string& uri, const std::string& method,
+                          const std::string& pin = "") {
+    return tpm_->Run(std::string(TARNIK_DEVICE_KEY_PROBE) + " '" + uri + "' '" + method + "' " +
+                     pin);
+  }
+
+  static inline std::unique_ptr<SoftwareTpm> tpm_;
+};
+
+TEST_F(DeviceKey, SignsAfterOneQuestionForThePin) {
+  EXPECT_EQ(Sign(kRsaKey, kRsaSha256, kPin), "verified, asked 1 times\n");
+  EXPECT_EQ(Sign(kEcKey, kEcdsaSha256, kPin), "verified, asked 1 times\n");
+}
+
+TEST_F(DeviceKey, IsNotLoadedWithoutAPin) {
+  EXPECT_EQ(Sign(kRsaKey, kRsaSha256), "The private key needs a passphrase, and none was given.\n");
+}
+
+TEST_F(DeviceKey, DoesNotSignWithAWrongPin) {
+  EXPECT_EQ(Sign(kRsaKey, kRsaSha256, "1234"), "The signature cannot be made: cannot sign.\n");
+}
+
+TEST_F(DeviceKey, IsCheckedAgainstTheAlgorithmBeforeTheDeviceIsAsked) {
+  EXPECT_EQ(Sign(kEcKey, kRsaSha256, kPin),
+            std::string("The private key is an EC key; the signature algorithm '") + kRsaSha256 +
+                "' needs an RSA key.\n");
+}
+
+TEST_F(DeviceKey, IsMissedUnderAnotherHandle) {
+  EXPECT_EQ(Sign("handle:0x81000009", kRsaSha256, kPin),
+            "The URI 'handle:' gives no private key: cannot load key.\n");
+}
+
+}  // namespace
+}  // namespace Tarnik::Crypto

@@ -1,0 +1,75 @@
+// Signs with a key of a TPM and verifies that. Usage: device_key_probe URI METHOD [PIN]
+// A program of its own, since a provider that is loaded serves the whole process.
+#include <openssl/provider.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/crypto/private_key.h>
+#include <tarnik/xml/security/signature.h>
+
+#include <iostream>
+#include <string>
+
+namespace {
+
+using Tarnik::Ref;
+using Tarnik::Crypto::PassphraseCallback;
+using Tarnik::Crypto::PrivateKey;
+using Tarnik::Xml::ElementNode;
+namespace Security = Tarnik::Xml::Security;
+
+constexpr const char* kExclusive = "http://www.w3.org/2001/10/xml-exc-c14n#";
+
+class KeyResolver final : public Security::KeyInfoResolver, public Tarnik::ObjectImpl {
+ public:
+  explicit KeyResolver(Ref<const Tarnik::Crypto::PublicKey> key) : key_(std::move(key)) {}
+  Ref<const Tarnik::Crypto::PublicKey> Resolve(const Security::KeyInfo&) const override {
+    return key_;
+  }
+
+ private:
+  const Ref<const Tarnik::Crypto::PublicKey> key_;
+};
+
+bool SignsWhatVerifies(const PrivateKey& key, const std::string& method) {
+  Ref<ElementNode> root;
+  CreateElementNode("", "Request", root);
+  root->SetAttribute("ID", "request");
+  Ref<Security::Signature> signature;
+  Security::CreateBlankSignature(root.get(), kExclusive, method, "ds", signature);
+  const auto reference =
+      signature->AddReference("#request", "http://www.w3.org/2001/04/xmlenc#sha256");
+  reference->AddTransform("http://www.w3.org/2000/09/xmldsig#enveloped-signature");
+  reference->AddTransform(kExclusive);
+  root->AppendChild(signature->Element());
+  signature->Sign(&key);
+  return signature->Verify(Tarnik::MakeRef<KeyResolver>(key.GetPublicKey()).get());
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  if (argc < 3) {
+    return 2;
+  }
+  if (OSSL_PROVIDER_load(nullptr, "default") == nullptr ||
+      OSSL_PROVIDER_load(nullptr, "tpm2") == nullptr) {
+    std::cout << "no provider\n";
+    return 1;
+  }
+  int asked = 0;
+  PassphraseCallback pin;
+  if (argc > 3) {
+    pin = [&asked, argv] {
+      ++asked;
+      return std::string(argv[3]);
+    };
+  }
+  try {
+    const Ref<const PrivateKey> key = Tarnik::Crypto::LoadPrivateKeyFromUri(argv[1], pin);
+    std::cout << (SignsWhatVerifies(*key, argv[2]) ? "verified" : "not verified") << ", asked "
+              << asked << " times\n";
+  } catch (const Tarnik::Exception& error) {
+    std::cout << error.Message() << "\n";
+  }
+  return 0;
+}
