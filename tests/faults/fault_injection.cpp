@@ -103,4 +103,15 @@ int __wrap_EVP_PKEY_verify(EVP_PKEY_CTX* context, const unsigned char* signature
              ? FaultInjection::plan.result
              : __real_EVP_PKEY_verify(context, signature, signatureSize, digest, digestSize);
 }
+
+int __real_EVP_PKEY_sign(EVP_PKEY_CTX* context, unsigned char* signature,
+                         std::size_t* signatureSize, const unsigned char* digest,
+                         std::size_t digestSize);
+int __wrap_EVP_PKEY_sign(EVP_PKEY_CTX* context, unsigned char* signature,
+                         std::size_t* signatureSize, const unsigned char* digest,
+                         std::size_t digestSize) {
+  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
+             ? FaultInjection::plan.result
+             : __real_EVP_PKEY_sign(context, signature, signatureSize, digest, digestSize);
+}
 }

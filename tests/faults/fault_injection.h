@@ -4,8 +4,8 @@
 #include <cstddef>
 
 /// Makes one call of a kind fail: an allocation by operator new or by the library's own malloc,
-/// which Expat's memory comes from, or a call of OpenSSL's that digests or verifies. For one thread
-/// at a time.
+/// which Expat's memory comes from, or a call of OpenSSL's that digests, verifies or signs. For one
+/// thread at a time.
 namespace FaultInjection {
 
 enum class Kind { kAllocation, kCrypto };

@@ -1,0 +1,151 @@
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/private_key.h>
+#include <tarnik/xml/security/signature.h>
+#include <tarnik/xml/security/xml_security_exception.h>
+#include <tarnik/xml/xml_writer.h>
+
+#include <devsts/certificates.h>
+#include <devsts/xml_security.h>
+#include <gtest/gtest.h>
+
+#include <new>
+
+#include "faults/fault_injection.h"
+
+// One call fails in the midst of making a signature: it is blank again, and signing it once more
+// gives what a judge accepts.
+namespace Tarnik::Xml::Security {
+namespace {
+
+using FaultInjection::Fault;
+using FaultInjection::Kind;
+
+constexpr const char* kExclusive = "http://www.w3.org/2001/10/xml-exc-c14n#";
+constexpr const char* kSha256 = "http://www.w3.org/2001/04/xmlenc#sha256";
+constexpr const char* kRsaSha256 = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
+
+enum class Outcome { kSigned, kRefused, kOutOfMemory };
+
+std::string TextOf(const Node* node) {
+  const Ref<StringWriter> writer = CreateStringWriter();
+  WriteXml(node, writer.get());
+  return writer->Text();
+}
+
+class SigningFaults : public testing::Test {
+ protected:
+  SigningFaults() : signer_(MakeSigner()) {
+    key_ = Crypto::CreatePrivateKeyFromPem(signer_.privateKeyPem);
+    // What is set up once for a key or in the process is not under test.
+    Prepare();
+    EXPECT_EQ(Sign(), Outcome::kSigned);
+  }
+
+  static DevSts::Credential MakeSigner() {
+    DevSts::CertificateSpec spec;
+    spec.commonName = "signer";
+    spec.keyType = DevSts::KeyType::Rsa2048;
+    return DevSts::MakeCertificate(spec);
+  }
+
+  /// Makes a request with a blank signature that covers its body.
+  void Prepare() {
+    CreateElementNode("", "Request", request_);
+    Ref<ElementNode> body;
+    CreateElementNode("", "Body", body);
+    body->SetAttribute("Id", "body");
+    request_->AppendChild(body.get());
+    CreateBlankSignature(request_.get(), kExclusive, kRsaSha256, "ds", signature_);
+    signature_->AddReference("#body", kSha256)->AddTransform(kExclusive);
+  }
+
+  Outcome Sign() {
+    try {
+      signature_->Sign(key_.get());
+      return Outcome::kSigned;
+    } catch (const std::bad_alloc&) {
+      return Outcome::kOutOfMemory;
+    } catch (const XmlSecurityException&) {
+      return Outcome::kRefused;
+    }
+  }
+
+  /// Signs with each call of `kind` failing in its turn; gives the number of them.
+  std::size_t FailEachCall(Kind kind, int result, Outcome expected) {
+    for (std::size_t index = 0;; ++index) {
+      Prepare();
+      const std::string blank = TextOf(signature_->Element());
+      Outcome outcome;
+      bool happened = false;
+      {
+        const Fault fault(kind, index, result);
+        outcome = Sign();
+        happened = fault.HasHappened();
+      }
+      if (!happened) {
+        EXPECT_EQ(outcome, Outcome::kSigned);
+        return index;
+      }
+      EXPECT_EQ(outcome, expected) << index;
+      EXPECT_EQ(TextOf(signature_->Element()), blank) << index;
+      EXPECT_EQ(Sign(), Outcome::kSigned) << index;
+      request_->AppendChild(signature_->Element());
+      EXPECT_TRUE(DevSts::VerifyXml(TextOf(request_.get()), signer_.certificatePem)) << index;
+    }
+  }
+
+  const DevSts::Credential signer_;
+  Ref<const Crypto::PrivateKey> key_;
+  Ref<ElementNode> request_;
+  Ref<Signature> signature_;
+};
+
+TEST_F(SigningFaults, LeaveABlankSignatureWhenMemoryIsOut) {
+  EXPECT_GT(FailEachCall(Kind::kAllocation, 0, Outcome::kOutOfMemory), 10U);
+}
+
+TEST_F(SigningFaults, LeaveABlankSignatureWhenTheCryptographicLibraryFails) {
+  for (const int result : {0, -1}) {
+    // Two digests of three calls or more, and one signature.
+    EXPECT_GE(FailEachCall(Kind::kCrypto, result, Outcome::kRefused), 7U);
+  }
+}
+
+// Each construction step fails in turn: nothing leaks, and nothing half made is handed out.
+TEST_F(SigningFaults, LeaveNothingBehindWhenASignatureIsBegun) {
+  std::size_t failures = 0;
+  for (bool happened = true; happened; ++failures) {
+    Ref<Signature> made;
+    const Fault fault(Kind::kAllocation, failures);
+    try {
+      CreateBlankSignature(request_.get(), kExclusive, kRsaSha256, "ds", made);
+    } catch (const std::bad_alloc&) {
+      EXPECT_EQ(made, nullptr);
+    }
+    happened = fault.HasHappened();
+    EXPECT_EQ(made == nullptr, happened) << failures;
+  }
+  EXPECT_GT(failures, 5U);
+}
+
+TEST_F(SigningFaults, LeaveABlankSignatureWhenAReferenceCannotBeAdded) {
+  std::size_t failures = 0;
+  for (bool happened = true; happened; ++failures) {
+    Prepare();
+    const std::string blank = TextOf(signature_->Element());
+    {
+      const Fault fault(Kind::kAllocation, failures);
+      try {
+        signature_->AddReference("#body", kSha256);
+      } catch (const std::bad_alloc&) {
+      }
+      happened = fault.HasHappened();
+    }
+    EXPECT_EQ(TextOf(signature_->Element()) == blank, happened) << failures;
+    EXPECT_EQ(Sign(), Outcome::kSigned) << failures;
+  }
+  EXPECT_GT(failures, 5U);
+}
+
+}  // namespace
+}  // namespace Tarnik::Xml::Security
