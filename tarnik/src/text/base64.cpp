@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cstring>
 #include <limits>
+#include <string>
 
 #include <tarnik/core/exception.h>
 
@@ -36,7 +37,7 @@ std::size_t Base64_EncodedLength(const unsigned char* data, std::size_t length) 
 void Base64_Encode(const unsigned char* data, std::size_t length, char* buffer,
                    std::size_t bufferSize, std::size_t* written) {
   const std::size_t needed = Base64_EncodedLength(data, length);
-  if (written == nullptr || (buffer == nullptr && needed != 0) || bufferSize < needed) {
+  if (written == nullptr || (buffer == nullptr && length != 0) || bufferSize < needed) {
     throw InvalidArgumentException("There is no room for a Base64 text of " +
                                    std::to_string(needed) + " characters.");
   }
