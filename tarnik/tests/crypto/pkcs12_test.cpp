@@ -117,8 +117,7 @@ TEST(Pkcs12, IsLoadedWithoutAQuestionWhenThePassphraseIsEmpty) {
 
 TEST(Pkcs12, RefusesAWrongPassphraseAndNone) {
   const std::string bytes = Encode(Make({}).get());
-  EXPECT_EQ(LoadError(bytes, nullptr),
-            "The private key needs a passphrase, and none was given.");
+  EXPECT_EQ(LoadError(bytes, nullptr), "The private key needs a passphrase, and none was given.");
   EXPECT_EQ(LoadError(bytes, "battery staple"),
             "The passphrase of the PKCS#12 is wrong, or the PKCS#12 is broken.");
   EXPECT_THROW(Load(bytes, []() -> std::string { throw std::out_of_range("no vault"); }),
