@@ -34,10 +34,25 @@ std::string SchemeOf(const std::string& uri) {
       errors.Describe(passphrase.WasNeeded() ? what + ", or the passphrase is wrong" : what));
 }
 
+// OpenSSL's adapter of PEM callbacks would leave the text on the stack.
+int Answer(UI* dialog, UI_STRING* question) noexcept {
+  const UI_string_types type = UI_get_string_type(question);
+  if (type != UIT_PROMPT && type != UIT_VERIFY) {
+    return 1;
+  }
+  try {
+    const std::string& text = static_cast<Passphrase*>(UI_get0_user_data(dialog))->Get();
+    const int set = UI_set_result_ex(dialog, question, text.data(), static_cast<int>(text.size()));
+    return set == 0 ? 1 : 0;
+  } catch (...) {
+    return 0;
+  }
+}
+
 // A method of the caller's passphrase alone: OpenSSL's own would ask on the terminal.
-OwnedUiMethod AskFor(const OpenSsl::ErrorScope& errors) {
-  OwnedUiMethod method(UI_UTIL_wrap_read_pem_callback(Passphrase::Read, 0));
-  if (method == nullptr) {
+OwnedUiMethod AskTheCaller(const OpenSsl::ErrorScope& errors) {
+  OwnedUiMethod method(UI_create_method("caller"));
+  if (method == nullptr || UI_method_set_reader(method.get(), Answer) != 0) {
     throw CryptoException(errors.Describe("The passphrase cannot be asked for"));
   }
   return method;
@@ -71,7 +86,7 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
   const std::string scheme = SchemeOf(uri);
   const OpenSsl::ErrorScope errors;
   Passphrase asked(passphrase);
-  const OwnedUiMethod method = AskFor(errors);
+  const OwnedUiMethod method = AskTheCaller(errors);
   const OpenSsl::OwnedStore store(OSSL_STORE_open_ex(uri.c_str(), nullptr, nullptr, method.get(),
                                                      &asked, nullptr, nullptr, nullptr));
   OpenSsl::OwnedKey key;

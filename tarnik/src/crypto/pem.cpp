@@ -43,7 +43,7 @@ PemReader::PemReader(std::string_view pem) {
   if (pem.size() > INT_MAX) {
     throw CryptoException("The PEM text is too long.");
   }
-  source_.reset(BIO_new_mem_buf(pem.data(), static_cast<int>(pem.size())));
+  source_.reset(BIO_new_mem_buf(pem.empty() ? "" : pem.data(), static_cast<int>(pem.size())));
   if (source_ == nullptr) {
     throw CryptoException(errors.Describe("The PEM text cannot be read"));
   }

@@ -169,6 +169,10 @@ TEST(PrivateKey, RefusesWhatIsNoKey) {
   }
 }
 
+TEST(PrivateKey, RefusesATextThatIsNotThere) {
+  EXPECT_EQ(LoadError(std::string_view()), "The PEM text holds no private key.");
+}
+
 TEST(PrivateKey, RefusesBrokenBlocks) {
   for (const char* label :
        {"PRIVATE KEY", "ENCRYPTED PRIVATE KEY", "RSA PRIVATE KEY", "EC PRIVATE KEY"}) {

@@ -59,11 +59,11 @@ struct KeyAndCertificate {
   std::vector<Ref<const Certificate>> chain;
 };
 
-/// Reads a PKCS#12 (RFC 7292). It must hold exactly one private key and that key's certificate.
+/// Reads a PKCS#12 (RFC 7292) with a MAC. It must hold one private key and that key's certificate.
 /// The passphrase, which may not hold a NUL, is asked for unless the empty one fits. Throws
 /// `CryptoException` when a key or a certificate is missing, no certificate belongs to the key,
-/// there are several keys, the passphrase is wrong or there is none, or the bytes are broken or
-/// protected by an algorithm that is not available.
+/// there are several keys, the passphrase is wrong or there is none, there is no MAC, or the bytes
+/// are broken or protected by an algorithm that is not available.
 TARNIK_EXPORT KeyAndCertificate CreateKeyAndCertificateFromPkcs12(
     const unsigned char* bytes, std::size_t length, const PassphraseCallback& passphrase = {});
 /// Reads a file of PKCS#12. Throws `IOException` when it cannot be read, else as above.
