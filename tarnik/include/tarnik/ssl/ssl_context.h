@@ -51,7 +51,8 @@ struct SSLContextConfig {
   /// If not empty, the peer's own certificate must also equal one of these byte for byte.
   std::vector<Ref<const Crypto::Certificate>> pinnedCertificates;
   /// Shown to a peer that asks for a certificate, with proof that `clientPrivateKey` is at hand.
-  /// Both are set or neither.
+  /// Both are set or neither. A key in a device serves here only if its provider gives the public
+  /// half to no other provider: TLS would try to sign with that.
   Ref<const Crypto::Certificate> clientCertificate;
   Ref<const Crypto::PrivateKey> clientPrivateKey;
   /// Sent behind `clientCertificate`: its issuers, each behind the one that it has issued.
