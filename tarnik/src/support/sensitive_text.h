@@ -9,8 +9,8 @@
 
 namespace Tarnik {
 
-/// Bytes that may hold passwords, keys or tokens: no copy is left behind in memory, neither when the text
-/// dies nor when it outgrows its buffer.
+/// Bytes that may hold passwords, keys or tokens: no copy is left behind in memory, neither when
+/// the text dies nor when it outgrows its buffer.
 class SensitiveText {
  public:
   SensitiveText() = default;
