@@ -1,14 +1,14 @@
 #include <ssoclient/saml_token.h>
 
-#include <functional>
-
 #include "support/assertion_text.h"
+#include "support/token_values.h"
 
 // Edits of a signed token's text: those that its canonical form ignores change nothing that a
 // caller sees, those of a value that is read are seen as tampering.
 namespace SsoClient {
 namespace {
 
+using TestSupport::AllValues;
 using TestSupport::AssertionText;
 using TestSupport::Replaced;
 
@@ -16,31 +16,6 @@ std::string SignedXml() {
   static const std::string xml =
       AssertionText().Delegate().ToSignedXml(TestSupport::TrustedCredential());
   return xml;
-}
-
-// Everything that a token tells, in one text.
-std::string AllValues(const SamlToken& token) {
-  std::string text = CreateSamlTokenDescription(token) + token.Id() + token.Issuer();
-  SubjectNames names;
-  token.GetSubjectNames(names);
-  text += names.givenName + names.surname;
-  std::set<std::string> audiences;
-  token.GetAudiences(audiences);
-  for (const std::string& audience : audiences) {
-    text += audience;
-  }
-  std::vector<Advice> advice;
-  token.GetAdvice(advice);
-  for (const Advice& block : advice) {
-    text += block.source;
-    for (const AdviceAttribute& attribute : block.attributes) {
-      text += attribute.name;
-      for (const std::string& value : attribute.values) {
-        text += value;
-      }
-    }
-  }
-  return text;
 }
 
 struct Edit {
