@@ -1,6 +1,7 @@
 #include <ssoclient/saml_token.h>
 
 #include "support/assertion_text.h"
+#include "support/thrown_message.h"
 #include "support/token_values.h"
 
 // Edits of a signed token's text: those that its canonical form ignores change nothing that a
@@ -55,6 +56,27 @@ TEST(NeutralEdit, AcceptsTextAroundTheDocumentElement) {
   EXPECT_EQ(AllValues(*CreateSamlToken("<?xml version=\"1.0\"?>\r\n<!--c-->" + SignedXml() + "\n",
                                        resolver.get())),
             AllValues(*CreateSamlToken(SignedXml(), resolver.get())));
+}
+
+// The name in xsi:type hangs on a declaration that exclusive canonical text leaves out where no
+// element or attribute uses it: whoever changes that changes nothing that is signed, and gains
+// nothing.
+TEST(PrefixEdit, OfATypesNamespaceLeavesNoTypeThatIsKnown) {
+  AssertionText text;
+  text.advice.clear();
+  const std::string original = text.ToSignedXml(TestSupport::TrustedCredential());
+  const auto resolver = TestSupport::TrustedResolver();
+  EXPECT_TRUE(CreateSamlToken(original, resolver.get())->IsRenewable());
+  const std::string condition = "<saml2:Condition xsi:type=\"rsa:RenewRestrictionType\"";
+  for (const char* uri : {"urn:other", "urn:oasis:names:tc:SAML:2.0:conditions:delegation",
+                          "urn:oasis:names:tc:SAML:2.0:assertion"}) {
+    const std::string edited =
+        Replaced(original, condition, condition + " xmlns:rsa=\"" + uri + "\"");
+    ASSERT_TRUE(DevSts::VerifyXml(edited, TestSupport::TrustedCredential().certificatePem));
+    EXPECT_EQ(TestSupport::ThrownMessage<ParseException>(
+                  [&] { CreateSamlToken(edited, resolver.get()); }),
+              "Unknown or duplicate restriction node under Conditions");
+  }
 }
 
 class ValueEdit : public testing::TestWithParam<Edit> {};
