@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 #include <openssl/ec.h>
 #include <openssl/obj_mac.h>
+#include <openssl/rsa.h>
 
 #include <tarnik/core/object_impl.h>
 #include <algorithm>
@@ -84,6 +85,49 @@ TEST(SignatureAttack, RsaKeysAreRefusedUpToTheLimit) {
                                                           std::to_string(bits) +
                                                           " bits; at least 2048 are needed.");
   }
+}
+
+std::vector<unsigned char> PssValueOf(EVP_PKEY* key, const std::string& text) {
+  const OpenSsl::OwnedDigestContext context(EVP_MD_CTX_new());
+  EVP_PKEY_CTX* keyContext = nullptr;
+  std::vector<unsigned char> value(static_cast<std::size_t>(EVP_PKEY_get_size(key)));
+  std::size_t length = value.size();
+  const auto* octets = reinterpret_cast<const unsigned char*>(text.data());
+  const bool isSigned =
+      EVP_DigestSignInit_ex(context.get(), &keyContext, "SHA256", nullptr, nullptr, key, nullptr) ==
+          1 &&
+      EVP_PKEY_CTX_set_rsa_padding(keyContext, RSA_PKCS1_PSS_PADDING) == 1 &&
+      EVP_PKEY_CTX_set_rsa_pss_saltlen(keyContext, RSA_PSS_SALTLEN_DIGEST) == 1 &&
+      EVP_DigestSign(context.get(), value.data(), &length, octets, text.size()) == 1;
+  return isSigned ? value : std::vector<unsigned char>();
+}
+
+// RFC 8017, section 8.1.2, step 1: a value that is shorter is no signature, even if it is the same
+// number. OpenSSL alone lets it pass.
+TEST(SignatureAttack, AnRsaPssValueWithoutItsLeadingZeroIsInvalid) {
+  SignOptions options;
+  options.signature = DevSts::SignatureAlgorithm::RsaPssSha256;
+  const std::string text = Signed(options);
+  const auto writer = CreateStringWriter();
+  const auto document = Tests::ParseDocument(text);
+  CreateCanonicalizer("http://www.w3.org/2001/10/xml-exc-c14n#")
+      ->Canonicalize(Tests::FindElement(document.get(), "SignedInfo"), writer.get());
+  const std::string& pem = Tests::Signer().privateKeyPem;
+  const OpenSsl::OwnedBio source(BIO_new_mem_buf(pem.data(), static_cast<int>(pem.size())));
+  const OpenSsl::OwnedKey key(PEM_read_bio_PrivateKey(source.get(), nullptr, nullptr, nullptr));
+  // One value in 256 begins with a zero, and each is another, for its salt is.
+  std::vector<unsigned char> value{1};
+  for (int attempt = 0; attempt < 10'000 && value.at(0) != 0; ++attempt) {
+    value = PssValueOf(key.get(), writer->Text());
+  }
+  ASSERT_EQ(value.at(0), 0);
+  const auto with = [&text](const std::vector<unsigned char>& octets) {
+    return ReplacedBetween(text, "<ds:SignatureValue>", "</ds:SignatureValue>",
+                           StringUtil::Base64Encode(octets));
+  };
+  EXPECT_EQ(Judge(with(value)), "valid");
+  value.erase(value.begin());
+  EXPECT_EQ(Judge(with(value)), "invalid");
 }
 
 // Numbers that are the same to who reckons without looking at their size: the order of P-521 leaves
