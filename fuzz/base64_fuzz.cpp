@@ -2,6 +2,7 @@
 // decodes again; and what is refused is no Base64 to OpenSSL either.
 #include <openssl/evp.h>
 #include <tarnik/core/exception.h>
+#include <tarnik/text/base64.h>
 #include <tarnik/text/string_util.h>
 
 #include <algorithm>
@@ -55,6 +56,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
 
   const Bytes original(data, data + size);
   const std::string encoded = Tarnik::StringUtil::Base64Encode(original);
+  std::string written(Tarnik::Base64_EncodedLength(data, size), '\0');
+  std::size_t length = 0;
+  Tarnik::Base64_Encode(data, size, written.data(), written.size(), &length);
+  Fuzz::Require(length == written.size() && written == encoded);
   Bytes decoded;
   Fuzz::Require(Decode(encoded, decoded) && decoded == original);
   return 0;
