@@ -1,4 +1,6 @@
-// An answer means the same in whatever pieces it comes, and never more than its bytes hold.
+// An answer means the same in whatever pieces it comes, never more than its bytes hold, is not
+// whole without its last byte, and is not changed by what follows it. The first byte is a piece's
+// size.
 #include <tarnik/http/http_exception.h>
 
 #include <algorithm>
@@ -11,9 +13,30 @@
 
 namespace {
 
-/// The body of the answer, or nothing when it is refused.
-std::optional<std::string> Read(std::string_view bytes, std::size_t pieceSize) {
-  Tarnik::Http::ResponseParser parser("sts.example.com:443");
+using Tarnik::Http::ResponseParser;
+
+struct Answer {
+  int code = 0;
+  std::string reason;
+  std::string body;
+
+  bool operator==(const Answer&) const = default;
+};
+
+Answer TakeAnswer(ResponseParser& parser) {
+  const auto response = parser.TakeResponse();
+  Answer answer{response->Status().code, response->Status().reason, ""};
+  Fuzz::Require(answer.code >= 200 && answer.code <= 999);
+  char buffer[4096];
+  while (const std::size_t count = response->Body()->Read(buffer, sizeof(buffer))) {
+    answer.body.append(buffer, count);
+  }
+  return answer;
+}
+
+/// The answer, or nothing when it is refused.
+std::optional<Answer> Read(std::string_view bytes, std::size_t pieceSize) {
+  ResponseParser parser("sts.example.com:443");
   try {
     for (; !bytes.empty(); bytes.remove_prefix(std::min(pieceSize, bytes.size()))) {
       parser.Feed(bytes.substr(0, pieceSize));
@@ -22,22 +45,51 @@ std::optional<std::string> Read(std::string_view bytes, std::size_t pieceSize) {
   } catch (const Tarnik::Http::HttpException&) {
     return std::nullopt;
   }
-  const auto response = parser.TakeResponse();
-  Fuzz::Require(response->Status().code >= 200 && response->Status().code <= 999);
-  std::string body;
-  char buffer[4096];
-  while (const std::size_t count = response->Body()->Read(buffer, sizeof(buffer))) {
-    body.append(buffer, count);
+  return TakeAnswer(parser);
+}
+
+/// How many bytes make the answer whole, if some do without the end of the connection.
+std::optional<std::size_t> OwnLength(std::string_view bytes) {
+  ResponseParser parser("sts.example.com:443");
+  for (std::size_t count = 0; count < bytes.size(); ++count) {
+    try {
+      parser.Feed(bytes.substr(count, 1));
+    } catch (const Tarnik::Http::HttpException&) {
+      return std::nullopt;
+    }
+    if (parser.IsDone()) {
+      return count + 1;
+    }
   }
-  return body;
+  return std::nullopt;
+}
+
+bool LetsAnotherFollow(std::string_view bytes) {
+  ResponseParser parser("sts.example.com:443");
+  parser.Feed(bytes);
+  return parser.MayReuseConnection();
 }
 
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-  const std::string bytes = Fuzz::TextOf(data, size);
-  const auto whole = Read(bytes, std::max<std::size_t>(size, 1));
+  if (size < 2) {
+    return 0;
+  }
+  const std::string bytes = Fuzz::TextOf(data + 1, size - 1);
+  const auto whole = Read(bytes, bytes.size());
   Fuzz::Require(whole == Read(bytes, 1));
-  Fuzz::Require(!whole || whole->size() < bytes.size());
+  Fuzz::Require(whole == Read(bytes, 1 + data[0]));
+  Fuzz::Require(!whole || whole->body.size() < bytes.size());
+  const auto length = OwnLength(bytes);
+  if (!whole || !length) {
+    return 0;
+  }
+  const std::string own = bytes.substr(0, *length);
+  Fuzz::Require(Read(own, own.size()) == whole);
+  Fuzz::Require(!Read(own.substr(0, own.size() - 1), own.size()));
+  const std::string withAnother = own + "HTTP/1.1 200 OK\r\nContent-Length: 1\r\n\r\nx";
+  Fuzz::Require(Read(withAnother, withAnother.size()) == whole);
+  Fuzz::Require(!LetsAnotherFollow(withAnother));
   return 0;
 }

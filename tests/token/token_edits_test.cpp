@@ -1,14 +1,15 @@
 #include <ssoclient/saml_token.h>
 
-#include <functional>
-
 #include "support/assertion_text.h"
+#include "support/thrown_message.h"
+#include "support/token_values.h"
 
 // Edits of a signed token's text: those that its canonical form ignores change nothing that a
 // caller sees, those of a value that is read are seen as tampering.
 namespace SsoClient {
 namespace {
 
+using TestSupport::AllValues;
 using TestSupport::AssertionText;
 using TestSupport::Replaced;
 
@@ -16,31 +17,6 @@ std::string SignedXml() {
   static const std::string xml =
       AssertionText().Delegate().ToSignedXml(TestSupport::TrustedCredential());
   return xml;
-}
-
-// Everything that a token tells, in one text.
-std::string AllValues(const SamlToken& token) {
-  std::string text = CreateSamlTokenDescription(token) + token.Id() + token.Issuer();
-  SubjectNames names;
-  token.GetSubjectNames(names);
-  text += names.givenName + names.surname;
-  std::set<std::string> audiences;
-  token.GetAudiences(audiences);
-  for (const std::string& audience : audiences) {
-    text += audience;
-  }
-  std::vector<Advice> advice;
-  token.GetAdvice(advice);
-  for (const Advice& block : advice) {
-    text += block.source;
-    for (const AdviceAttribute& attribute : block.attributes) {
-      text += attribute.name;
-      for (const std::string& value : attribute.values) {
-        text += value;
-      }
-    }
-  }
-  return text;
 }
 
 struct Edit {
@@ -80,6 +56,27 @@ TEST(NeutralEdit, AcceptsTextAroundTheDocumentElement) {
   EXPECT_EQ(AllValues(*CreateSamlToken("<?xml version=\"1.0\"?>\r\n<!--c-->" + SignedXml() + "\n",
                                        resolver.get())),
             AllValues(*CreateSamlToken(SignedXml(), resolver.get())));
+}
+
+// The name in xsi:type hangs on a declaration that exclusive canonical text leaves out where no
+// element or attribute uses it: whoever changes that changes nothing that is signed, and gains
+// nothing.
+TEST(PrefixEdit, OfATypesNamespaceLeavesNoTypeThatIsKnown) {
+  AssertionText text;
+  text.advice.clear();
+  const std::string original = text.ToSignedXml(TestSupport::TrustedCredential());
+  const auto resolver = TestSupport::TrustedResolver();
+  EXPECT_TRUE(CreateSamlToken(original, resolver.get())->IsRenewable());
+  const std::string condition = "<saml2:Condition xsi:type=\"rsa:RenewRestrictionType\"";
+  for (const char* uri : {"urn:other", "urn:oasis:names:tc:SAML:2.0:conditions:delegation",
+                          "urn:oasis:names:tc:SAML:2.0:assertion"}) {
+    const std::string edited =
+        Replaced(original, condition, condition + " xmlns:rsa=\"" + uri + "\"");
+    ASSERT_TRUE(DevSts::VerifyXml(edited, TestSupport::TrustedCredential().certificatePem));
+    EXPECT_EQ(TestSupport::ThrownMessage<ParseException>(
+                  [&] { CreateSamlToken(edited, resolver.get()); }),
+              "Unknown or duplicate restriction node under Conditions");
+  }
 }
 
 class ValueEdit : public testing::TestWithParam<Edit> {};

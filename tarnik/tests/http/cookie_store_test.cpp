@@ -90,19 +90,20 @@ TEST_P(IgnoredCookieTest, IsNotStored) {
 
 INSTANTIATE_TEST_SUITE_P(
     CookieStore, IgnoredCookieTest,
-    testing::Values(IgnoredCookie{""}, IgnoredCookie{"novalue"}, IgnoredCookie{"=value"},
-                    IgnoredCookie{" =value"}, IgnoredCookie{"; a=1"},
-                    IgnoredCookie{"a=1; Domain=other.example"},
-                    IgnoredCookie{"a=1; Domain=example.evil"}, IgnoredCookie{"a=1; Domain=example"},
-                    IgnoredCookie{"a=1; Domain=.example"}, IgnoredCookie{"a=1; Domain=ts.example"},
-                    IgnoredCookie{"a=1; Domain=a.sts.example"}, IgnoredCookie{"a=1; Max-Age=0"},
-                    IgnoredCookie{"a=1; Max-Age=-1"},
-                    IgnoredCookie{"a=1; Max-Age=-99999999999999999999"},
-                    IgnoredCookie{"a=1; Expires=Tue, 01 Jan 2030 00:00:00 GMT"},
-                    IgnoredCookie{"a=1; Expires=Wed, 01 Jan 2020 00:00:00 GMT"},
-                    IgnoredCookie{"a=1\r\nX: y"}, IgnoredCookie{std::string("a=1\0", 4)},
-                    IgnoredCookie{"a=\x01"}, IgnoredCookie{"a=b\tc"}, IgnoredCookie{"a\tb=c"},
-                    IgnoredCookie{"a=1\x7F"}, IgnoredCookie{"a=" + std::string(4095, 'x')}));
+    testing::Values(
+        IgnoredCookie{""}, IgnoredCookie{"novalue"}, IgnoredCookie{"=value"},
+        IgnoredCookie{" =value"}, IgnoredCookie{"; a=1"},
+        IgnoredCookie{"a=1; Domain=other.example"}, IgnoredCookie{"a=1; Domain=example.evil"},
+        IgnoredCookie{"a=1; Domain=example"}, IgnoredCookie{"a=1; Domain=.example"},
+        IgnoredCookie{"a=1; Domain=ts.example"}, IgnoredCookie{"a=1; Domain=a.sts.example"},
+        IgnoredCookie{"a=1; Max-Age=0"}, IgnoredCookie{"a=1; Max-Age=-1"},
+        IgnoredCookie{"a=1; Max-Age=-99999999999999999999"},
+        IgnoredCookie{"a=1; Expires=Tue, 01 Jan 2030 00:00:00 GMT"},
+        IgnoredCookie{"a=1; Expires=Wed, 01 Jan 2020 00:00:00 GMT"}, IgnoredCookie{"a=1\r\nX: y"},
+        IgnoredCookie{std::string("a=1\0", 4)}, IgnoredCookie{"a=\x01"}, IgnoredCookie{"a=b\tc"},
+        IgnoredCookie{"a\tb=c"}, IgnoredCookie{"a=1\x7F"}, IgnoredCookie{"a=1; Path=/\x01"},
+        IgnoredCookie{"a=1; x\r\nX: y"}, IgnoredCookie{std::string("a=1; Secure\0", 12)},
+        IgnoredCookie{"a=" + std::string(4095, 'x')}));
 
 TEST_F(CookieStoreTest, AcceptsACookieOfTheLargestSize) {
   const std::string cookie = "a=" + std::string(4094, 'x');

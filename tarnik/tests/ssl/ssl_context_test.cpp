@@ -63,6 +63,24 @@ TEST(SSLContext, OffersNoWeakSuites) {
   }
 }
 
+// NIST SP 800-57, part 1, section 5.6.1: 1024 bits are worth 80, and 112 are asked for.
+TEST(SSLContext, RefusesAPeerWithAShortKey) {
+  for (const auto& [bits, message] :
+       {std::pair{1024U,
+                  "TLS handshake with sts.example failed: EE certificate key too weak "
+                  "(CN=sts.example)"},
+        std::pair{2048U, ""}}) {
+    IdentityOptions options;
+    options.rsaBits = bits;
+    const auto leaf = MakeIdentity(options, &TestPki::Get().root);
+    TlsPeerOptions peer;
+    peer.identity = &leaf;
+    peer.securityLevel = 0;
+    TlsServer server(peer, 1);
+    EXPECT_EQ(TlsClient(*TrustingContext(TestPki::Get().root), server.Port()).Message(), message);
+  }
+}
+
 class SSLContextResumption : public testing::TestWithParam<int> {
  protected:
   SSLContextResumption() {

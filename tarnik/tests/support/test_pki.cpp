@@ -66,6 +66,10 @@ void AddNames(X509* certificate, const IdentityOptions& options) {
   }
 }
 
+EVP_PKEY* MakeKey(unsigned rsaBits) {
+  return rsaBits == 0 ? EVP_EC_gen("P-256") : EVP_RSA_gen(rsaBits);
+}
+
 }  // namespace
 
 std::string Identity::Pem() const {
@@ -83,7 +87,7 @@ Ref<const Crypto::Certificate> Identity::ToCertificate() const {
 }
 
 Identity MakeIdentity(const IdentityOptions& options, const Identity* issuer) {
-  Identity made{OpenSsl::OwnedCertificate(X509_new()), OpenSsl::OwnedKey(EVP_EC_gen("P-256"))};
+  Identity made{OpenSsl::OwnedCertificate(X509_new()), OpenSsl::OwnedKey(MakeKey(options.rsaBits))};
   X509* certificate = made.certificate.get();
   X509* issuing = issuer == nullptr ? certificate : issuer->certificate.get();
   Require(made.key != nullptr && X509_set_version(certificate, X509_VERSION_3) == 1);

@@ -31,6 +31,8 @@ struct IdentityOptions {
   long notAfter = 3600;
   /// For example "clientAuth"; none if empty.
   std::string extendedKeyUsage = "";
+  /// The bits of an RSA key; 0 stands for a key on P-256.
+  unsigned rsaBits = 0;
 };
 
 /// Issued by `issuer`, or by itself if that is null.

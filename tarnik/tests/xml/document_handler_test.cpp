@@ -104,6 +104,15 @@ TEST(DocumentHandlerTest, KeepsCommentsBetweenTexts) {
   EXPECT_EQ(static_cast<const TextNode*>(first->NextSibling()->NextSibling())->Text(), ".evil");
 }
 
+TEST(DocumentHandlerTest, KeepsInstructionsBetweenTexts) {
+  const Ref<Document> document = ParseXml("<r>admin<?p d?>.evil</r>");
+  const Node* first = document->RootElement()->FirstChild();
+  ASSERT_EQ(first->Kind(), NodeKind::kText);
+  EXPECT_EQ(static_cast<const TextNode*>(first)->Text(), "admin");
+  ASSERT_EQ(first->NextSibling()->Kind(), NodeKind::kProcessingInstruction);
+  EXPECT_EQ(static_cast<const TextNode*>(first->NextSibling()->NextSibling())->Text(), ".evil");
+}
+
 TEST(DocumentHandlerTest, KeepsAttributesAndDeclarationsInTheirOrder) {
   const Ref<Document> document = ParseXml("<r z='1' xmlns:b='urn:b' b:y='2' xmlns='urn:d' a='3'/>");
   const ElementNode* root = document->RootElement();

@@ -371,6 +371,22 @@ TEST(XMLParserTest, GivesTheSameTreeHoweverTheReaderCutsTheText) {
   }
 }
 
+// What a document begins with is looked at as a whole, even if the reader gives less.
+TEST(XMLParserTest, RefusesUtf16HoweverTheReaderCutsTheText) {
+  for (const std::string& text :
+       {std::string("\xFF\xFE<\0a\0/\0>\0", 10), std::string("\xFE\xFF\0<\0a\0/\0>", 10),
+        std::string("<\0a\0/\0>\0", 8), std::string("\0<\0a\0/\0>", 8)}) {
+    for (const std::size_t piece : {1, 2, 3}) {
+      try {
+        ParseXml(MakeRef<PieceReader>(text, piece).get());
+        ADD_FAILURE() << piece;
+      } catch (const XMLParseException& exception) {
+        EXPECT_EQ(exception.Message(), kUtf16Message);
+      }
+    }
+  }
+}
+
 // Time of the processor, which other programs on the machine do not lengthen.
 double SecondsToParse(const std::string& text, std::size_t piece) {
   double best = 1e9;

@@ -1,0 +1,33 @@
+#ifndef SSOCLIENT_TESTS_TOKEN_EDITOR_H
+#define SSOCLIENT_TESTS_TOKEN_EDITOR_H
+
+#include <cstddef>
+#include <functional>
+#include <string>
+
+namespace TestSupport {
+
+/// Makes signed assertions of every kind and edits them, as a source of numbers decides: by chance,
+/// or by a fuzzer's input.
+class TokenEditor {
+ public:
+  /// `below` gives a number below its argument, which is at least one.
+  explicit TokenEditor(std::function<std::size_t(std::size_t)> below);
+
+  /// An assertion signed by the trusted credential.
+  std::string SignedXml();
+  /// Changes, removes, repeats or inserts something.
+  void Edit(std::string& xml);
+
+ private:
+  std::string Snippet();
+  std::string Insertion();
+  void InsertAtTag(std::string& xml);
+  void MoveElement(std::string& xml);
+
+  std::function<std::size_t(std::size_t)> below_;
+};
+
+}  // namespace TestSupport
+
+#endif

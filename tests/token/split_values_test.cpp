@@ -1,0 +1,95 @@
+#include <ssoclient/saml_token.h>
+
+#include "support/assertion_text.h"
+#include "support/thrown_message.h"
+#include "support/token_values.h"
+
+// Values that something stands in the middle of: a reader that takes the first piece of text for
+// the whole would read another name than was signed.
+namespace SsoClient {
+namespace {
+
+using TestSupport::AssertionText;
+using TestSupport::Replaced;
+
+struct SplitValue {
+  const char* name;
+  std::string value;  ///< as it stands once in the text
+  std::size_t at;     ///< where it is split
+};
+
+void PrintTo(const SplitValue& split, std::ostream* stream) {
+  *stream << split.name;
+}
+
+std::string UnsignedXml() {
+  AssertionText text;
+  text.Delegate();
+  text.signature.clear();
+  return text.ToXml();
+}
+
+std::string SignedXml(const std::string& xml) {
+  const DevSts::Credential& signer = TestSupport::TrustedCredential();
+  DevSts::SignOptions options;
+  options.signature = DevSts::SignatureAlgorithm::EcdsaSha256;
+  return DevSts::SignXml(xml, signer.privateKeyPem, signer.certificatePem, options);
+}
+
+std::string SplitBy(const std::string& xml, const SplitValue& split, const std::string& node) {
+  std::string value = split.value;
+  return Replaced(xml, split.value, value.insert(split.at, node));
+}
+
+class SplitValues : public testing::TestWithParam<SplitValue> {
+ protected:
+  static void ExpectRefused(const std::string& xml) {
+    const auto resolver = TestSupport::TrustedResolver();
+    const std::string message =
+        TestSupport::ThrownMessage<ParseException>([&] { CreateSamlToken(xml, resolver.get()); });
+    EXPECT_TRUE(
+        message.ends_with("' must only have textual content (but has extra children or is empty)."))
+        << message;
+    EXPECT_THROW(CreateSamlToken(xml), ParseException);
+  }
+};
+
+// Whoever writes the signature does not matter here: not even the trusted signer may do so.
+TEST_P(SplitValues, AreRefusedAlsoWhenSigned) {
+  for (const char* node : {"<!---->", "<!--x-->", "<?p?>", "<?p x?>", "<x/>", "<x>y</x>"}) {
+    const std::string xml = SignedXml(SplitBy(UnsignedXml(), GetParam(), node));
+    ASSERT_TRUE(DevSts::VerifyXml(xml, TestSupport::TrustedCredential().certificatePem));
+    ExpectRefused(xml);
+  }
+}
+
+// A comment leaves the signature good, for its canonical form holds none.
+TEST_P(SplitValues, AreRefusedWhenSplitByACommentAfterwards) {
+  const std::string xml = SplitBy(SignedXml(UnsignedXml()), GetParam(), "<!---->");
+  ASSERT_TRUE(DevSts::VerifyXml(xml, TestSupport::TrustedCredential().certificatePem));
+  ExpectRefused(xml);
+}
+
+// The twin: split by what is text itself, the value is read whole.
+TEST_P(SplitValues, AreReadWholeWhenSplitByText) {
+  const auto resolver = TestSupport::TrustedResolver();
+  const std::string original = SignedXml(UnsignedXml());
+  const std::string values = TestSupport::AllValues(*CreateSamlToken(original, resolver.get()));
+  const std::string xml = SplitBy(original, GetParam(), "<![CDATA[]]>");
+  EXPECT_EQ(TestSupport::AllValues(*CreateSamlToken(xml, resolver.get())), values);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Values, SplitValues,
+    testing::Values(SplitValue{"Subject", "alice@example.com", 9},
+                    SplitValue{"Delegate", "first@example.com", 9},
+                    SplitValue{"Issuer", "https://sts.example.com/STS", 19},
+                    SplitValue{"Audience", "https://a.example", 9},
+                    SplitValue{"Group", "EXAMPLE\\admins", 13},
+                    SplitValue{"IsSolution", ">false<", 3}, SplitValue{"GivenName", ">Alice<", 3},
+                    SplitValue{"Surname", ">Archer<", 3}, SplitValue{"AdviceValue", ">one<", 2},
+                    SplitValue{"AuthnContextClass", "PasswordProtectedTransport", 8}),
+    [](const auto& tested) { return tested.param.name; });
+
+}  // namespace
+}  // namespace SsoClient
