@@ -3,8 +3,10 @@
 #include <openssl/evp.h>
 #include <openssl/pem.h>
 #include <openssl/rsa.h>
+#include <ssoclient/saml_token.h>
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/reader.h>
+#include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/security/signature.h>
@@ -15,7 +17,11 @@
 #include <string>
 #include <vector>
 
-// Signing a request of two references by RSA-SHA256, beside the floor: the RSA operation alone.
+#include "sample_token.h"
+#include "sts/request_builder_impl.h"
+
+// Making whole requests signed by RSA-SHA256, and signing two references alone, beside the floor:
+// the RSA operation alone.
 namespace Bench {
 namespace {
 
@@ -61,6 +67,42 @@ void SignRequest(benchmark::State& state) {
   }
 }
 BENCHMARK(SignRequest)->Arg(2000)->Arg(20000)->Unit(benchmark::kMicrosecond);
+
+SsoClient::RequestBuilderImpl MakeBuilder() {
+  return SsoClient::RequestBuilderImpl(SsoClient::HolderOfKeyConfig{
+      Tarnik::Crypto::CreateCertificatesFromPem(Signer().certificatePem).front(),
+      Tarnik::Crypto::CreatePrivateKeyFromPem(Signer().privateKeyPem)});
+}
+
+SsoClient::TokenSpec OneHour() {
+  SsoClient::TokenSpec spec;
+  spec.tokenLifetimeSec = 3600;
+  return spec;
+}
+
+void CertificateRequest(benchmark::State& state) {
+  const auto builder = MakeBuilder();
+  const auto spec = OneHour();
+  for (auto _ : state) {
+    SsoClient::SoapRequest request;
+    builder.BuildAcquireTokenByCertificateRequest(spec, request);
+    benchmark::DoNotOptimize(request.body.data());
+  }
+}
+BENCHMARK(CertificateRequest)->Unit(benchmark::kMicrosecond);
+
+void TokenRequest(benchmark::State& state) {
+  const auto builder = MakeBuilder();
+  const auto spec = OneHour();
+  const auto size = static_cast<std::size_t>(state.range(0));
+  const auto token = SsoClient::CreateSamlToken(GetSampleToken(size).xml);
+  for (auto _ : state) {
+    SsoClient::SoapRequest request;
+    builder.BuildAcquireTokenByTokenRequest(*token, spec, request);
+    benchmark::DoNotOptimize(request.body.data());
+  }
+}
+BENCHMARK(TokenRequest)->Arg(6000)->Unit(benchmark::kMicrosecond);
 
 struct FreeKey {
   void operator()(EVP_PKEY* key) const { EVP_PKEY_free(key); }
