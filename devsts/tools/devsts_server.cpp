@@ -22,9 +22,11 @@ namespace {
 constexpr std::string_view kUsage =
     "usage: devsts_server [--http-port N] [--https-port N] [--address ADDRESS] [--out DIR]\n"
     "                     [--vendor-host HOST] [--solution-host HOST] [--end-with-stdin]\n"
+    "                     [--no-resumption]\n"
     "Port 0 takes a free one. DIR receives ca.pem and signing.pem, and client.pem and\n"
     "client-key.pem, by which machine@EXAMPLE.COM may ask for tokens.\n"
-    "With --end-with-stdin, each line of standard input is a command: revoke ID.\n";
+    "With --end-with-stdin, each line of standard input is a command: revoke ID.\n"
+    "With --no-resumption, TLS sessions are not resumed.\n";
 
 constexpr char kClientUser[] = "machine@EXAMPLE.COM";
 
@@ -70,6 +72,10 @@ Arguments Parse(int argc, char** argv) {
       arguments.endWithStdin = true;
       continue;
     }
+    if (name == "--no-resumption") {
+      arguments.options.tls.sessionResumption = false;
+      continue;
+    }
     if (++i == argc) {
       throw std::invalid_argument("no value for " + name);
     }
@@ -87,7 +93,7 @@ void PrintRequest(const DevSts::ReceivedRequest& request) {
   const auto signature = static_cast<std::size_t>(request.signature);
   constexpr std::array<const char*, 4> kSignatures{"none", "certificate", "token", "other"};
   std::cout << "request connection=" << request.connectionId << " tls=" << request.overTls
-            << " action=" << request.Header("SOAPAction")
+            << " resumed=" << request.tlsSessionReused << " action=" << request.Header("SOAPAction")
             << " signature=" << kSignatures.at(signature) << " status=" << request.answeredStatus;
   if (!request.answeredFault.empty()) {
     std::cout << " fault=" << request.answeredFault;
