@@ -33,6 +33,26 @@ TEST(XmlCharsTest, TextsHoldTheCharactersOfXmlAndNoOthers) {
   }
 }
 
+TEST(XmlCharsTest, AnOctetCountsWhereverItStands) {
+  constexpr std::size_t kLength = 27;
+  for (int octet = 0; octet <= 0xFF; ++octet) {
+    const bool isText = octet < 0x80 && xmlIsCharQ(static_cast<unsigned>(octet)) != 0;
+    for (std::size_t position = 0; position < kLength; ++position) {
+      std::string text(kLength, 'a');
+      text[position] = static_cast<char>(octet);
+      ASSERT_EQ(IsXmlText(text), isText) << octet << " at " << position;
+    }
+  }
+}
+
+TEST(XmlCharsTest, LongTextsMayHoldOtherCharactersAnywhere) {
+  constexpr std::size_t kLength = 27;
+  for (std::size_t position = 0; position <= kLength; ++position) {
+    std::string text(kLength, '~');
+    EXPECT_TRUE(IsXmlText(text.insert(position, "\xE2\x82\xAC\n"))) << position;
+  }
+}
+
 TEST(XmlCharsTest, OverlongFormsAreNoText) {
   for (unsigned character = 0; character < 0x10000; ++character) {
     for (int octets = OctetsOf(character) + 1; octets <= 4; ++octets) {
