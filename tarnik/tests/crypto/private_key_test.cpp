@@ -134,8 +134,21 @@ TEST_P(EncryptedPrivateKey, PassesOnWhatTheCallbackThrows) {
 TEST_P(EncryptedPrivateKey, TakesAPassphraseOf1024BytesAndNoLonger) {
   const std::string longest(1024, 'p');
   EXPECT_TRUE(IsKey(CreatePrivateKeyFromPem(Pem(longest), [&] { return longest; }), SharedEcKey()));
-  EXPECT_EQ(LoadError(Pem(), [&] { return longest + "p"; }),
-            "The passphrase is longer than 1024 bytes.");
+  for (const std::size_t length : {std::size_t{1025}, std::size_t{10} << 20}) {
+    EXPECT_EQ(LoadError(Pem(), [length] { return std::string(length, 'p'); }),
+              "The passphrase is longer than 1024 bytes.");
+  }
+}
+
+TEST_P(EncryptedPrivateKey, TakesAnEmptyPassphraseForOne) {
+  int asked = 0;
+  const std::string message = LoadError(Pem(), [&asked] {
+    ++asked;
+    return std::string();
+  });
+  EXPECT_EQ(asked, 1);
+  EXPECT_EQ(message.find("The private key cannot be decrypted: the passphrase is wrong"), 0U)
+      << message;
 }
 
 TEST_P(EncryptedPrivateKey, TakesAPassphraseWithANul) {
