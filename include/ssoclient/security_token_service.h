@@ -90,8 +90,8 @@ class SecurityTokenService {
 /// A service that connects by itself, with a connection and cookies of its own for each operation.
 /// Throws `Tarnik::InvalidArgumentException` for a malformed URL, for an https URL without an SSL
 /// context, when the token factory is null, and for a holder-of-key configuration that cannot work:
-/// a null part, a key that is not the certificate's, or one that is not an RSA key of at least
-/// 2048 bits.
+/// a null part, a certificate whose key is broken or of an unknown kind, a key that is not the
+/// certificate's, or one that is not an RSA key of at least 2048 bits.
 SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfig& config);
 /// A service that sends through the caller's user agent. Throws `Tarnik::InvalidArgumentException`
