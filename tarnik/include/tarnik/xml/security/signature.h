@@ -83,9 +83,10 @@ class TARNIK_EXPORT Signature : public virtual Object {
 
   /// Makes `content` the one child of ds:KeyInfo, taking it from the parent that it had, in place
   /// of what was set before. Without this call there is no ds:KeyInfo. Throws
-  /// `InvalidArgumentException` when `content` is null or holds the signature,
-  /// `SignatureSyntaxException` when a reader of the signature would refuse it, and
-  /// `InvalidStateException` unless the signature is blank; the signature is then as before.
+  /// `InvalidArgumentException` when `content` is null, holds the signature or is part of it,
+  /// `SignatureSyntaxException` when a reader of the signature would refuse it (`content` is then
+  /// without a parent), and `InvalidStateException` unless the signature is blank; the signature is
+  /// then as before.
   virtual void SetKeyInfo(ElementNode* content) = 0;
 
   /// Computes the digests of all references and the signature value with `key`, and writes both
