@@ -20,8 +20,10 @@ namespace SsoClient {
 ///
 /// Each operation throws
 ///  - `Tarnik::InvalidArgumentException` for arguments that cannot be sent, before anything is
-///    sent: a lifetime that is not positive, a text that XML cannot carry, and what the operation
-///    tells;
+///    sent: a lifetime that is not positive, a text that XML cannot carry, a token that carries an
+///    id of the signed request itself, and what the operation tells;
+///  - `Tarnik::Xml::XMLParseException`, also before anything is sent, when the text of a token that
+///    the caller gives is malformed;
 ///  - `Tarnik::InvalidStateException`, also before anything is sent, when the operation needs a
 ///    `HolderOfKeyConfig` and there is none, or its certificate is not valid now;
 ///  - `CommunicationException` when the exchange fails or takes longer than 240 seconds;
@@ -31,7 +33,9 @@ namespace SsoClient {
 ///  - `InvalidTokenException` (`ParseException`, `InvalidSignatureException`) or another
 ///    `Tarnik::Exception` (such as `Tarnik::Xml::XMLParseException`) when the token factory refuses
 ///    the answered token;
-///  - `Tarnik::Xml::Security::XmlSecurityException` when a key fails to sign.
+///  - `Tarnik::Xml::Security::XmlSecurityException` when a key fails to sign, and when a token that
+///    is to be signed along declares a namespace with a relative URI (Canonical XML 1.0, section
+///    1.3).
 ///
 /// A token that an operation returns is null only if the service answers with an empty token text.
 ///
@@ -90,8 +94,8 @@ class SecurityTokenService {
 /// A service that connects by itself, with a connection and cookies of its own for each operation.
 /// Throws `Tarnik::InvalidArgumentException` for a malformed URL, for an https URL without an SSL
 /// context, when the token factory is null, and for a holder-of-key configuration that cannot work:
-/// a null part, a key that is not the certificate's, or one that is not an RSA key of at least
-/// 2048 bits.
+/// a null part, a certificate whose key is broken or of an unknown kind, a key that is not the
+/// certificate's, or one that is not an RSA key of at least 2048 bits.
 SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfig& config);
 /// A service that sends through the caller's user agent. Throws `Tarnik::InvalidArgumentException`

@@ -17,7 +17,8 @@ class SamlToken;
 
 /// What token a caller asks the security token service for. A plain value.
 struct TokenSpec {
-  /// Requested lifetime in seconds; must be positive.
+  /// Requested lifetime in seconds from now on; must be positive. One that leaves the calendar ends
+  /// with the year 9999.
   std::int64_t tokenLifetimeSec = 0;
   /// Audiences that the token is to be restricted to; none if empty.
   std::set<std::string> audienceRestriction;
@@ -27,7 +28,7 @@ struct TokenSpec {
   bool delegable = false;
   /// The principal to whom the token is to be delegated.
   boost::optional<std::string> delegateTo;
-  /// A token on whose behalf the request is made.
+  /// A token on whose behalf the request is made; must not be null if set.
   boost::optional<std::shared_ptr<const SamlToken>> actAsToken;
   /// Ask for a token that may be renewed.
   bool renewable = false;

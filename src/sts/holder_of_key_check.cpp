@@ -3,6 +3,7 @@
 #include <string>
 
 #include <tarnik/core/exception.h>
+#include <tarnik/crypto/crypto_exception.h>
 
 #include "token/default_clock_tolerance.h"
 
@@ -18,6 +19,15 @@ constexpr int kMinRsaBits = 2048;  // NIST SP 800-131A
 void Require(bool isGood, const char* complaint) {
   if (!isGood) {
     throw Tarnik::InvalidArgumentException(std::string("HolderOfKeyConfig: ") + complaint);
+  }
+}
+
+bool BelongTogether(const HolderOfKeyConfig& config) {
+  try {
+    return config.privateKey->Matches(*config.certificate);
+  } catch (const Tarnik::Crypto::CryptoException& error) {
+    throw Tarnik::InvalidArgumentException("HolderOfKeyConfig: the certificate cannot be used: " +
+                                           error.Message());
   }
 }
 
@@ -38,9 +48,10 @@ void CheckHolderOfKeyConfig(const boost::optional<HolderOfKeyConfig>& config) {
   }
   Require(config->certificate != nullptr, "the certificate must not be null.");
   Require(config->privateKey != nullptr, "the private key must not be null.");
-  Require(config->privateKey->Matches(*config->certificate),
-          "the private key does not belong to the certificate.");
+  Require(BelongTogether(*config), "the private key does not belong to the certificate.");
   const auto key = config->privateKey->GetPublicKey();
+  // The key may be of the caller's own making.
+  Require(key != nullptr, "the private key has no public half.");
   Require(key->Algorithm() == KeyAlgorithm::kRsa,
           "the key must be an RSA key, since requests are signed with RSA-SHA256.");
   Require(key->Bits() >= kMinRsaBits, "the RSA key must have at least 2048 bits.");

@@ -10,8 +10,8 @@ namespace SsoClient {
 
 /// Judges what a service is given to sign with, so that a mistake is not found out by the first
 /// request that the security token service refuses. Throws `Tarnik::InvalidArgumentException` when
-/// a part is null, the key is not the certificate's, or it cannot sign RSA-SHA256; nothing without
-/// a configuration.
+/// a part is null, the certificate's key cannot be read, the private key is not that key's, or it
+/// cannot sign RSA-SHA256; nothing without a configuration.
 void CheckHolderOfKeyConfig(const boost::optional<HolderOfKeyConfig>& config);
 
 /// Throws `Tarnik::InvalidStateException` when `certificate` is not valid at `now`, with a

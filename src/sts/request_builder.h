@@ -14,8 +14,9 @@ namespace SsoClient {
 /// Makes the requests of a service's operations. Safe from many threads.
 ///
 /// In each operation `request` is assigned only on success. Each throws
-///  - `Tarnik::InvalidArgumentException` when a lifetime is not positive, and when a text cannot be
-///    sent: the message then names its element, never the text;
+///  - `Tarnik::InvalidArgumentException` when a lifetime is not positive, when a text cannot be
+///    sent: the message then names its element, never the text; and when a token carries an id of
+///    the signed request itself;
 ///  - `Tarnik::InvalidStateException` when a key is needed and there is none, and when the
 ///    certificate of the key is not valid now;
 ///  - `Tarnik::Xml::XMLParseException` when the text of a presented token is malformed;

@@ -37,6 +37,9 @@ inline constexpr char kBase64BinaryEncoding[] =
 /// The Id of a request's signature, by which wst:UseKey names it.
 inline constexpr char kProofSignatureId[] = "holderOfKeyProofSignature";
 
+/// The wsu:Id of the certificate in a request's header, by which its signature names it.
+inline constexpr char kCertificateId[] = "holderOfKeyCertificate";
+
 }  // namespace SsoClient
 
 #endif

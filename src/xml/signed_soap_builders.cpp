@@ -11,8 +11,6 @@ namespace SsoClient {
 
 namespace {
 
-constexpr char kCertificateId[] = "holderOfKeyCertificate";
-
 std::shared_ptr<XMLBaseBuilder> BuildCertificateReference() {
   auto reference =
       MakeCompositeBuilder("wsse", "SecurityTokenReference", {{"xmlns:wsse", kWsseNamespace}});

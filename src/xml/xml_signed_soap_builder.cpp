@@ -8,6 +8,7 @@
 
 #include "xml/envelope.h"
 #include "xml/namespaces.h"
+#include "xml/own_ids.h"
 
 namespace SsoClient {
 
@@ -55,6 +56,7 @@ XMLSignedSoapBuilder::XMLSignedSoapBuilder(std::shared_ptr<XMLBaseBuilder> heade
 
 void XMLSignedSoapBuilder::Build(Ref<ElementNode>& out) const {
   BuildEnvelope(header_, body_)->Build(out);
+  RequireOwnIds(*out);
   ElementNode* body = out->FirstChildElement(kSoapNamespace, "Body");
   ElementNode* security = out->FirstChildElement(kSoapNamespace, "Header")
                               ->FirstChildElement(kWsseNamespace, "Security");

@@ -20,7 +20,8 @@ class XMLSignedSoapBuilder final : public XMLBaseBuilder {
                        Tarnik::Ref<const Tarnik::Crypto::PrivateKey> privateKey,
                        std::shared_ptr<XMLBaseBuilder> keyInfo);
 
-  /// Throws `Tarnik::Xml::Security::XmlSecurityException` when the key cannot sign; `out` then
+  /// Throws `Tarnik::Xml::Security::XmlSecurityException` when the key cannot sign, and
+  /// `Tarnik::InvalidArgumentException` when a token carries an id of the request's own; `out` then
   /// holds an envelope without a signature.
   void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const override;
 

@@ -3,6 +3,7 @@
 
 #include <future>
 #include <memory>
+#include <mutex>
 #include <optional>
 #include <stdexcept>
 #include <string>
@@ -20,12 +21,14 @@
 
 namespace SsoClient::Testing {
 
-/// Records what is sent and answers each request with one text, or fails.
+/// Records what is sent and answers each request with one text, or fails. Requests may be sent from
+/// many threads; the records are read when all is done.
 class FakeTransport final : public Transport {
  public:
   explicit FakeTransport(std::string answer) : answer_(std::move(answer)) {}
 
   std::shared_ptr<TransportSession> CreateSession() const override {
+    const std::lock_guard lock(mutex_);
     ++sessions;
     return std::make_shared<Session>(*this);
   }
@@ -42,8 +45,7 @@ class FakeTransport final : public Transport {
 
     void SendRequest(const SoapRequest& request,
                      Tarnik::Ref<Tarnik::Reader>& reader) const override {
-      transport_.actions.push_back(request.action);
-      transport_.bodies.push_back(request.body);
+      transport_.Record(request);
       if (transport_.failure) {
         transport_.failure->Throw();
       }
@@ -59,10 +61,17 @@ class FakeTransport final : public Transport {
     const FakeTransport& transport_;
   };
 
+  void Record(const SoapRequest& request) const {
+    const std::lock_guard lock(mutex_);
+    actions.push_back(request.action);
+    bodies.push_back(request.body);
+  }
+
+  mutable std::mutex mutex_;
   std::string answer_;
 };
 
-/// Makes a token of any text, or refuses all.
+/// Makes a token of any text, or refuses all; from many threads, too.
 class FakeTokenFactory final : public SamlTokenFactory {
  public:
   std::shared_ptr<const SamlToken> CreateToken(const std::string&) const override {
@@ -70,8 +79,7 @@ class FakeTokenFactory final : public SamlTokenFactory {
   }
   std::shared_ptr<const SamlToken> CreateToken(const std::string& xml,
                                                long clockToleranceSec) const override {
-    texts.push_back(xml);
-    tolerances.push_back(clockToleranceSec);
+    Record(xml, clockToleranceSec);
     if (isRefusing) {
       throw InvalidSignatureException("refused");
     }
@@ -87,6 +95,15 @@ class FakeTokenFactory final : public SamlTokenFactory {
   bool isRefusing = false;
   mutable std::vector<std::string> texts;
   mutable std::vector<long> tolerances;
+
+ private:
+  void Record(const std::string& xml, long clockToleranceSec) const {
+    const std::lock_guard lock(mutex_);
+    texts.push_back(xml);
+    tolerances.push_back(clockToleranceSec);
+  }
+
+  mutable std::mutex mutex_;
 };
 
 /// What a callback was given.

@@ -2,8 +2,12 @@
 
 #include <gmock/gmock.h>
 #include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
 
 #include <chrono>
+#include <string>
+#include <utility>
+#include <vector>
 
 #include "support/holder_of_key.h"
 #include "support/thrown_message.h"
@@ -49,6 +53,61 @@ TEST(HolderOfKeyCheckTest, RefusesKeysThatCannotSign) {
             "RSA-SHA256.");
   EXPECT_EQ(Complaint(Testing::ConfigOf(Testing::KeyCredential(DevSts::KeyType::Rsa1024))),
             "HolderOfKeyConfig: the RSA key must have at least 2048 bits.");
+}
+
+/// A certificate of the caller's own making, which claims to be these bytes.
+class ForeignCertificate final : public Tarnik::Crypto::Certificate, public Tarnik::ObjectImpl {
+ public:
+  explicit ForeignCertificate(std::string der) : der_(std::move(der)) {}
+
+  const unsigned char* DerBytes() const noexcept override {
+    return der_.empty() ? nullptr : reinterpret_cast<const unsigned char*>(der_.data());
+  }
+  std::size_t DerLength() const noexcept override { return der_.size(); }
+  const std::string& SubjectName() const override { return der_; }
+  const std::string& IssuerName() const override { return der_; }
+  const std::string& SerialNumber() const override { return der_; }
+  DateTime NotBefore() const override { return GetUtcDateTime(); }
+  DateTime NotAfter() const override { return GetUtcDateTime(); }
+  const std::vector<unsigned char>& SubjectKeyIdentifier() const override { return identifier_; }
+  Tarnik::Ref<const Tarnik::Crypto::PublicKey> GetPublicKey() const override { return nullptr; }
+
+ private:
+  std::string der_;
+  std::vector<unsigned char> identifier_;
+};
+
+/// A private key of the caller's own making, which claims to fit.
+class ForeignKey final : public Tarnik::Crypto::PrivateKey, public Tarnik::ObjectImpl {
+ public:
+  Tarnik::Ref<const Tarnik::Crypto::PublicKey> GetPublicKey() const override { return nullptr; }
+  bool Matches(const Tarnik::Crypto::Certificate&) const override { return true; }
+};
+
+TEST(HolderOfKeyCheckTest, RefusesCertificatesThatHoldNoKey) {
+  auto config = Testing::ConfigOf(Testing::KeyCredential());
+  config.certificate = Tarnik::MakeRef<const ForeignCertificate>("");
+  EXPECT_EQ(Complaint(config),
+            "HolderOfKeyConfig: the certificate cannot be used: A certificate cannot be empty.");
+  config.certificate = Tarnik::MakeRef<const ForeignCertificate>("no DER");
+  EXPECT_THAT(Complaint(config),
+              testing::StartsWith("HolderOfKeyConfig: the certificate cannot be used: The "
+                                  "certificate cannot be decoded: "));
+  const auto genuine = Testing::ConfigOf(Testing::KeyCredential()).certificate;
+  std::string unknownKind(reinterpret_cast<const char*>(genuine->DerBytes()), genuine->DerLength());
+  // The object identifier of RSA keys, with another last arc.
+  const std::string rsa("\x2a\x86\x48\x86\xf7\x0d\x01\x01\x01", 9);
+  unknownKind.replace(unknownKind.find(rsa) + 8, 1, "\x7f");
+  config.certificate = Tarnik::MakeRef<const ForeignCertificate>(unknownKind);
+  EXPECT_EQ(Complaint(config),
+            "HolderOfKeyConfig: the certificate cannot be used: The certificate's public key is "
+            "broken or of an unknown kind.");
+}
+
+TEST(HolderOfKeyCheckTest, RefusesAForeignKeyWithoutAPublicHalf) {
+  auto config = Testing::ConfigOf(Testing::KeyCredential());
+  config.privateKey = Tarnik::MakeRef<const ForeignKey>();
+  EXPECT_EQ(Complaint(config), "HolderOfKeyConfig: the private key has no public half.");
 }
 
 std::string PeriodComplaint(const Tarnik::Crypto::Certificate& certificate, const DateTime& now) {

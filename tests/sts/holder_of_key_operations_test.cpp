@@ -1,7 +1,12 @@
 #include <gmock/gmock.h>
 #include <tarnik/core/exception.h>
 
+#include <array>
+#include <atomic>
+#include <set>
 #include <string>
+#include <thread>
+#include <vector>
 
 #include "describe/describe.h"
 #include "sts/answers.h"
@@ -176,6 +181,38 @@ TEST(HolderOfKeyOperationsAsyncTest, TwinsGiveTokens) {
     EXPECT_EQ(report.errorType, "");
     EXPECT_NE(report.token, nullptr);
   }
+}
+
+TEST(HolderOfKeyOperationsAsyncTest, ThreadsMaySignWithOneServiceThatIsReleasedMeanwhile) {
+  constexpr int kThreads = 4;
+  constexpr int kRounds = 8;
+  const Sts sts(IssueAnswer());
+  auto service = sts.Service();
+  const auto presented = Presented();
+  std::array<std::array<Testing::AsyncCall, kRounds>, kThreads> calls;
+  std::atomic<int> tokens{0};
+  std::vector<std::thread> threads;
+  for (auto& callsOfThread : calls) {
+    threads.emplace_back([&tokens, &presented, &callsOfThread, shared = service]() mutable {
+      for (auto& call : callsOfThread) {
+        shared->AcquireTokenByTokenAsync(presented, OneHour(), call.Callback());
+        tokens += shared->AcquireTokenByCertificate(OneHour()) != nullptr ? 1 : 0;
+      }
+      shared = nullptr;
+    });
+  }
+  service = nullptr;
+  for (auto& thread : threads) {
+    thread.join();
+  }
+  for (auto& callsOfThread : calls) {
+    for (auto& call : callsOfThread) {
+      tokens += call.Wait().token != nullptr ? 1 : 0;
+    }
+  }
+  EXPECT_EQ(tokens, 2 * kThreads * kRounds);
+  const std::set<std::string> different(sts.transport->bodies.begin(), sts.transport->bodies.end());
+  EXPECT_EQ(different.size(), 2U * kThreads * kRounds);
 }
 
 TEST(HolderOfKeyOperationsAsyncTest, TwinsReportErrorsWithTheirClass) {

@@ -296,6 +296,43 @@ TEST(RequestSigningTokenTest, AMalformedTokenTextLeavesTheRequestAsItWas) {
   EXPECT_EQ(request.body, "");
 }
 
+Testing::FakeSamlToken TokenWith(const std::string& attributes) {
+  Testing::FakeSamlToken token("<Assertion ID=\"_presented\" " + attributes + "/>");
+  token.id = "_presented";
+  return token;
+}
+
+constexpr char kUtility[] =
+    " xmlns:u=\"http://docs.oasis-open.org/wss/2004/01/"
+    "oasis-200401-wss-wssecurity-utility-1.0.xsd\"";
+
+// The ids of what is signed are drawn anew for each request.
+TEST(RequestSigningTokenTest, IdsInsideOfTokensDoNotDivertTheSignature) {
+  for (const std::string& attributes :
+       {std::string("u:Id=\"Body\"") + kUtility, std::string("id=\"Timestamp\"")}) {
+    SoapRequest request;
+    BuilderWithKey().BuildAcquireTokenByTokenRequest(TokenWith(attributes), SpecOf(60), request);
+    const auto verdict = DevSts::VerifyXml(request.body, Credential().certificatePem);
+    EXPECT_TRUE(verdict.valid) << attributes << ": " << verdict.reason;
+  }
+}
+
+TEST(RequestSigningTokenTest, TokensMayNotCarryTheIdsOfTheRequestItself) {
+  for (const std::string& id :
+       {std::string("holderOfKeyProofSignature"), std::string("holderOfKeyCertificate")}) {
+    for (const std::string& attributes :
+         {"u:Id=\"" + id + "\"" + kUtility, "Id=\"" + id + "\"", "xml:id=\"" + id + "\""}) {
+      auto spec = SpecOf(60);
+      spec.actAsToken = std::make_shared<Testing::FakeSamlToken>(TokenWith(attributes));
+      SoapRequest request;
+      EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
+                    [&] { ByCertificate(BuilderWithKey(), spec, request); }),
+                "A token in the request carries the id '" + id + "', which is the request's own");
+      EXPECT_EQ(request.body, "");
+    }
+  }
+}
+
 TEST(RequestSigningDelegationTest, ADelegatedTokenIsSignedForWithoutUseKey) {
   auto spec = SpecOf(60);
   spec.delegateTo = "bob";

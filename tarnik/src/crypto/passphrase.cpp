@@ -11,6 +11,12 @@ namespace {
 // PEM_BUFSIZE of OpenSSL: what its callbacks have room for.
 constexpr std::size_t kMaxPassphraseBytes = 1024;
 
+/// What the callback gives, cleansed also when it is refused.
+struct Given {
+  std::string text;
+  ~Given() { StringUtil::Cleanse(text); }
+};
+
 }  // namespace
 
 Passphrase::~Passphrase() {
@@ -38,15 +44,13 @@ void Passphrase::Ask() {
   if (!callback_) {
     throw CryptoException("The private key needs a passphrase, and none was given.");
   }
-  // Short texts lie in the string itself, where a move would leave them.
-  std::string given = callback_();
-  text_.reserve(given.size());
-  text_ = given;
-  StringUtil::Cleanse(given);
-  if (text_.size() > kMaxPassphraseBytes) {
+  const Given given{callback_()};
+  if (given.text.size() > kMaxPassphraseBytes) {
     throw CryptoException("The passphrase is longer than " + std::to_string(kMaxPassphraseBytes) +
                           " bytes.");
   }
+  // Short texts lie in the string itself, where a move would leave them.
+  text_ = given.text;
   isKnown_ = true;
 }
 

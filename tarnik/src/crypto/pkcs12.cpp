@@ -71,7 +71,12 @@ int CountKeys(const STACK_OF(PKCS12_SAFEBAG) * bags) {
   for (int i = 0; i < sk_PKCS12_SAFEBAG_num(bags); ++i) {
     const PKCS12_SAFEBAG* bag = sk_PKCS12_SAFEBAG_value(bags, i);
     const int kind = PKCS12_SAFEBAG_get_nid(bag);
-    count += kind == NID_keyBag || kind == NID_pkcs8ShroudedKeyBag ? 1 : 0;
+    if (kind == NID_keyBag || kind == NID_pkcs8ShroudedKeyBag) {
+      ++count;
+    } else if (kind == NID_safeContentsBag) {
+      // Bags within bags (RFC 7292, section 4.2.6): OpenSSL decodes only so many levels.
+      count += CountKeys(PKCS12_SAFEBAG_get0_safes(bag));
+    }
   }
   return count;
 }

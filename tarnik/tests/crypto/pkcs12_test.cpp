@@ -74,11 +74,43 @@ std::string LoadError(const std::string& bytes, const char* passphrase = kSecret
   return "loaded";
 }
 
-/// Adds a second key to a PKCS#12 without a passphrase on its content, as some programs write it.
-std::string WithTwoKeys() {
+std::string Der(unsigned char tag, const std::string& content) {
+  const std::size_t length = content.size();
+  std::string header(1, static_cast<char>(tag));
+  for (const unsigned value :
+       {0x82U, static_cast<unsigned>(length >> 8), static_cast<unsigned>(length & 0xFF)}) {
+    header.push_back(static_cast<char>(value));
+  }
+  return header + content;
+}
+
+/// A bag that holds `bags`, which it takes (RFC 7292, section 4.2.6). OpenSSL reads such bags, but
+/// makes none.
+PKCS12_SAFEBAG* BagOf(STACK_OF(PKCS12_SAFEBAG) * bags) {
+  unsigned char* bytes = nullptr;
+  const int length =
+      ASN1_item_i2d(reinterpret_cast<ASN1_VALUE*>(bags), &bytes, ASN1_ITEM_rptr(PKCS12_SAFEBAGS));
+  const OpenSsl::OwnedMemory<unsigned char> owner(bytes);
+  sk_PKCS12_SAFEBAG_pop_free(bags, PKCS12_SAFEBAG_free);
+  const std::string kind("\x06\x0b\x2a\x86\x48\x86\xf7\x0d\x01\x0c\x0a\x01\x06");
+  const std::string held(reinterpret_cast<const char*>(bytes), static_cast<std::size_t>(length));
+  const std::string bag = Der(0x30, kind + Der(0xA0, held));
+  const auto* position = reinterpret_cast<const unsigned char*>(bag.data());
+  PKCS12_SAFEBAG* made = d2i_PKCS12_SAFEBAG(nullptr, &position, static_cast<long>(bag.size()));
+  if (made == nullptr) {
+    throw std::runtime_error("test set-up failed: a bag of bags");
+  }
+  return made;
+}
+
+STACK_OF(PKCS12_SAFEBAG) * BagsWith(const Identity& identity) {
   STACK_OF(PKCS12_SAFEBAG)* bags = nullptr;
-  PKCS12_add_key(&bags, Pki::Get().leaf.key.get(), 0, 100, -1, kSecret);
-  PKCS12_add_key(&bags, Pki::Get().stranger.key.get(), 0, 100, -1, kSecret);
+  PKCS12_add_key(&bags, identity.key.get(), 0, 100, -1, kSecret);
+  return bags;
+}
+
+/// Takes `bags` and puts no passphrase on them, as some programs do.
+std::string Pack(STACK_OF(PKCS12_SAFEBAG) * bags) {
   STACK_OF(PKCS7)* safes = nullptr;
   PKCS12_add_safe(&safes, bags, -1, 0, nullptr);
   sk_PKCS12_SAFEBAG_pop_free(bags, PKCS12_SAFEBAG_free);
@@ -148,7 +180,27 @@ TEST(Pkcs12, RefusesWhatIsNotThere) {
 }
 
 TEST(Pkcs12, RefusesASecondKey) {
-  EXPECT_EQ(LoadError(WithTwoKeys()), "The PKCS#12 holds more than one private key.");
+  STACK_OF(PKCS12_SAFEBAG)* bags = BagsWith(Pki::Get().leaf);
+  PKCS12_add_key(&bags, Pki::Get().stranger.key.get(), 0, 100, -1, kSecret);
+  EXPECT_EQ(LoadError(Pack(bags)), "The PKCS#12 holds more than one private key.");
+}
+
+TEST(Pkcs12, RefusesASecondKeyInABagOfBags) {
+  STACK_OF(PKCS12_SAFEBAG)* bags = BagsWith(Pki::Get().leaf);
+  PKCS12_add_cert(&bags, Pki::Get().leaf.certificate.get());
+  STACK_OF(PKCS12_SAFEBAG)* inner = sk_PKCS12_SAFEBAG_new_null();
+  sk_PKCS12_SAFEBAG_push(inner, BagOf(BagsWith(Pki::Get().stranger)));
+  sk_PKCS12_SAFEBAG_push(bags, BagOf(inner));
+  EXPECT_EQ(LoadError(Pack(bags)), "The PKCS#12 holds more than one private key.");
+}
+
+// The twin of the above.
+TEST(Pkcs12, FindsItsOneKeyInABagOfBags) {
+  STACK_OF(PKCS12_SAFEBAG)* bags = nullptr;
+  PKCS12_add_cert(&bags, Pki::Get().leaf.certificate.get());
+  sk_PKCS12_SAFEBAG_push(bags, BagOf(BagsWith(Pki::Get().leaf)));
+  const KeyAndCertificate loaded = Load(Pack(bags), [] { return std::string(kSecret); });
+  EXPECT_TRUE(loaded.privateKey->Matches(*loaded.certificate));
 }
 
 TEST(Pkcs12, RefusesOneThatNothingProtectsAgainstChanges) {

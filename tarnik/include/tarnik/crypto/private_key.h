@@ -26,9 +26,13 @@ class TARNIK_EXPORT PrivateKey : public virtual Object {
   virtual bool Matches(const Certificate& certificate) const = 0;
 };
 
-/// Gives the passphrase of an encrypted key, or the PIN of a device: at most 1024 bytes. It is
-/// called at most once for each load, and only if there is something to decrypt or unlock; the text
-/// that it returns is overwritten after use. What it throws passes through the load unchanged.
+/// Gives the passphrase of an encrypted key, or the PIN of a device: at most 1024 bytes; an empty
+/// one is tried like any other. It is called at most once for each load, on the thread of the load,
+/// and only if there is something to decrypt or unlock; the text that it returns is overwritten
+/// after use. What it throws passes through the load unchanged.
+///
+/// How much work a passphrase takes to be tried stands in the encrypted key itself and is not
+/// limited here: keys of strangers may take very long.
 using PassphraseCallback = std::function<std::string()>;
 
 /// Reads the one private key of a PEM text (RFC 7468): PKCS#8 (RFC 5958), plain or encrypted, or

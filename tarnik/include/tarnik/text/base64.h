@@ -16,7 +16,8 @@ TARNIK_EXPORT std::size_t Base64_EncodedLength(const unsigned char* data, std::s
 /// Writes the standard, padded Base64 text (RFC 4648, section 4) of `length` bytes at `data` to
 /// `buffer`, in one line and without a terminating NUL, and sets `written` to its length, which is
 /// that of `Base64_EncodedLength`. Throws `InvalidArgumentException` as that function does, when
-/// `written` is null, and when `bufferSize` characters are too few; nothing is written then.
+/// `written` is null, when `bufferSize` characters are too few, and when `buffer` is null though
+/// there are bytes; nothing is written then. `data` and `buffer` may not overlap.
 TARNIK_EXPORT void Base64_Encode(const unsigned char* data, std::size_t length, char* buffer,
                                  std::size_t bufferSize, std::size_t* written);
 

@@ -162,7 +162,9 @@ void NewSignature::AddTransform(std::size_t index, std::string_view algorithm) {
 
 void NewSignature::SetKeyInfo(ElementNode* content) {
   RequireBlank();
-  if (content == nullptr || IsWithin(element_.get(), content)) {
+  // The signature's own parts stay where they are.
+  if (content == nullptr || IsWithin(element_.get(), content) ||
+      IsWithin(content, element_.get())) {
     throw InvalidArgumentException("This is no element that KeyInfo could hold.");
   }
   const Ref<ElementNode> keyInfo = MakeElement("KeyInfo");

@@ -153,6 +153,63 @@ TEST(NewSignature, RefusesKeyInfoThatAReaderWouldRefuse) {
   EXPECT_EQ(Tests::Judge(made), "valid");
 }
 
+TEST(NewSignature, KeepsItsOwnPartsOutOfItsKeyInfo) {
+  Request request;
+  request.Reference("#body");
+  Ref<ElementNode> token;
+  CreateElementNode("", "Token", token);
+  request.signature->SetKeyInfo(token.get());
+  const std::string blank = TextOf(request.signature->Element());
+  for (const char* part : {"SignedInfo", "Reference", "SignatureValue", "KeyInfo", "Token"}) {
+    ElementNode* element = Tests::FindElement(request.signature->Element(), part);
+    ASSERT_NE(element, nullptr) << part;
+    EXPECT_EQ(Refusal([&] { request.signature->SetKeyInfo(element); }),
+              "argument: This is no element that KeyInfo could hold.")
+        << part;
+    EXPECT_EQ(TextOf(request.signature->Element()), blank) << part;
+  }
+  request.signature->Sign(SignerKey().get());
+  request.Place();
+  EXPECT_EQ(Tests::Judge(request.Text()), "valid");
+}
+
+TEST(NewSignature, RefusesAKeyInfoThatHoldsWhatIsSigned) {
+  Request request;
+  request.Reference("#body");
+  request.signature->SetKeyInfo(Tests::FindElement(request.document.get(), "Body"));
+  const std::string inside = "security: The reference '#body' points into the signature itself.";
+  EXPECT_EQ(Refusal([&] { request.signature->Sign(SignerKey().get()); }), inside);
+  request.Place();
+  EXPECT_EQ(Refusal([&] { request.signature->Sign(SignerKey().get()); }), inside);
+}
+
+TEST(NewSignature, RefusesAKeyInfoThatHoldsTheWholeDocument) {
+  Request request;
+  request.signature->AddReference("", kSha256)->AddTransform(kEnveloped);
+  request.Reference("#body");
+  request.signature->SetKeyInfo(request.document->RootElement());
+  EXPECT_EQ(Refusal([&] { request.signature->Sign(SignerKey().get()); }),
+            "security: The reference '' points into the signature itself.");
+}
+
+TEST(NewSignature, LooksForReferencesWhenItSigns) {
+  Request request;
+  request.Reference("#body");
+  const Ref<ElementNode> body(Tests::FindElement(request.document.get(), "Body"));
+  body->Parent()->RemoveChild(body.get());
+  const std::string blank = TextOf(request.signature->Element());
+  EXPECT_EQ(Refusal([&] { request.signature->Sign(SignerKey().get()); }),
+            "security: No element carries the id 'body' of a reference.");
+  EXPECT_EQ(TextOf(request.signature->Element()), blank);
+  // What is put elsewhere is found there.
+  request.document->RootElement()->FirstChildElement("Header")->AppendChild(body.get());
+  request.Reference("#time");
+  request.signature->Sign(SignerKey().get());
+  request.Place();
+  EXPECT_EQ(Tests::Judge(request.Text()), "valid");
+  EXPECT_TRUE(DevSts::VerifyXml(request.Text(), Tests::Signer().certificatePem));
+}
+
 TEST(NewSignature, SignsTheElementThatEnclosesIt) {
   Request request;
   request.document->RootElement()->SetAttribute("ID", "all");

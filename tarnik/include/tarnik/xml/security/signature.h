@@ -15,10 +15,10 @@ namespace Tarnik::Xml::Security {
 
 /// One ds:Reference (XML-Signature, section 4.3.3).
 struct Reference {
-  std::string uri;  ///< as written; empty for the whole document
-  std::string digestMethod;
-  std::vector<std::string> transforms;  ///< algorithm URIs, in order
-  std::vector<unsigned char> digestValue;
+  std::string uri;                         ///< as written; empty for the whole document
+  std::string digestMethod;                ///< the algorithm's URI
+  std::vector<std::string> transforms;     ///< algorithms' URIs, in order
+  std::vector<unsigned char> digestValue;  ///< the digest itself, decoded
 };
 
 /// A reference of a signature that is being made. Lives as long as the signature, which it keeps
@@ -43,9 +43,13 @@ class TARNIK_EXPORT SignatureReference : public virtual Object {
 /// changes the tree; a blank one is used by one thread at a time.
 class TARNIK_EXPORT Signature : public virtual Object {
  public:
+  /// The algorithms' URIs, as written. This and what the next accessors give is valid as long as
+  /// the signature.
   virtual const std::string& CanonicalizationMethod() const = 0;
   virtual const std::string& SignatureMethod() const = 0;
+  /// In the order of SignedInfo.
   virtual const std::vector<Reference>& References() const = 0;
+  /// What ds:KeyInfo holds; its `element` is null when there is none.
   virtual const Security::KeyInfo& KeyInfo() const = 0;
   /// The ds:Signature element. That of a made signature is there from the start and has its values
   /// once it is signed; the caller puts it into the document, before or after signing.
@@ -83,9 +87,10 @@ class TARNIK_EXPORT Signature : public virtual Object {
 
   /// Makes `content` the one child of ds:KeyInfo, taking it from the parent that it had, in place
   /// of what was set before. Without this call there is no ds:KeyInfo. Throws
-  /// `InvalidArgumentException` when `content` is null or holds the signature,
-  /// `SignatureSyntaxException` when a reader of the signature would refuse it, and
-  /// `InvalidStateException` unless the signature is blank; the signature is then as before.
+  /// `InvalidArgumentException` when `content` is null, holds the signature or is part of it,
+  /// `SignatureSyntaxException` when a reader of the signature would refuse it (`content` is then
+  /// without a parent), and `InvalidStateException` unless the signature is blank; the signature is
+  /// then as before.
   virtual void SetKeyInfo(ElementNode* content) = 0;
 
   /// Computes the digests of all references and the signature value with `key`, and writes both
