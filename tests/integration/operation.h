@@ -1,0 +1,56 @@
+#ifndef TESTS_INTEGRATION_OPERATION_H
+#define TESTS_INTEGRATION_OPERATION_H
+
+#include <ssoclient/ssoclient.h>
+
+#include <future>
+#include <iosfwd>
+#include <memory>
+#include <optional>
+#include <string>
+#include <typeindex>
+
+#include "integration/sts_fixture.h"
+
+namespace SsoClient::Tests {
+
+/// The operations of a service, for tests that are about all of them.
+enum class Operation { Password, Certificate, Token, Renew, Validate };
+
+inline constexpr Operation kOperations[] = {Operation::Password, Operation::Certificate,
+                                            Operation::Token, Operation::Renew,
+                                            Operation::Validate};
+
+/// The synchronous operation's name in `SecurityTokenService`.
+const char* NameOf(Operation operation);
+std::ostream& operator<<(std::ostream& stream, Operation operation);
+
+/// Arguments for any operation, which takes its part of them. Renewal takes the spec's lifetime.
+struct Arguments {
+  TokenSpec spec = TenMinutes();
+  std::shared_ptr<const SamlToken> token;
+  std::string userName = kUser;
+  std::string password = kPassword;
+};
+
+/// How an operation ended. Without an error, its class is `void`.
+struct Outcome {
+  std::shared_ptr<const SamlToken> token;
+  std::optional<bool> verdict;
+  std::type_index errorClass = typeid(void);
+  std::string message;
+
+  bool IsSuccess() const { return errorClass == typeid(void); }
+};
+
+/// Runs the synchronous operation.
+Outcome CallNow(Operation operation, const SecurityTokenService& service,
+                const Arguments& arguments);
+
+/// Starts the asynchronous twin. `arguments.token` stays alive until the callback has run.
+std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& service,
+                               const Arguments& arguments);
+
+}  // namespace SsoClient::Tests
+
+#endif

@@ -1,0 +1,145 @@
+// Assertions of other shapes keep their signatures when they travel in requests.
+#include <devsts/xml_security.h>
+#include <gmock/gmock.h>
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/xml_parser.h>
+
+#include "integration/holder_of_key_fixture.h"
+#include "integration/operation.h"
+#include "integration/wire_request.h"
+
+namespace SsoClient::Tests {
+namespace {
+
+struct Shape {
+  const char* name;
+  void (*change)(DevSts::AssertionOptions& options);
+};
+
+class TravellingTokenShapesTest : public HolderOfKeyTest,
+                                  public ::testing::WithParamInterface<Shape> {
+ protected:
+  TravellingTokenShapesTest() {
+    DevSts::AssertionOptions options;
+    GetParam().change(options);
+    Sts().SetAssertionOptions(options);
+  }
+  static std::shared_ptr<const SamlToken> DelegableBearer() {
+    TokenSpec spec = Bearer();
+    spec.delegable = true;
+    return Acquire(spec);
+  }
+};
+
+TEST_P(TravellingTokenShapesTest, AreAcceptedByEveryOperationAndVerifyOnTheirOwn) {
+  Arguments arguments;
+  TokenSpec spec = RenewableAndDelegable();
+  spec.advice = {{"urn:source", {{"urn:name", {"<&>]]>\r\n\t", ""}}}}};
+  arguments.token = AcquireBound(spec);
+  arguments.spec.actAsToken = DelegableBearer();
+  const auto service = HolderService();
+  const std::string signer = Sts().SigningCertificatePem();
+  for (const Operation operation :
+       {Operation::Certificate, Operation::Token, Operation::Renew, Operation::Validate}) {
+    SCOPED_TRACE(NameOf(operation));
+    const Outcome outcome = CallNow(operation, *service, arguments);
+    EXPECT_TRUE(outcome.IsSuccess()) << outcome.message;
+    EXPECT_NE(outcome.verdict, false);
+    const std::string sent = AssertionIn(Sts().LastRequest().body);
+    const DevSts::VerifyResult result = DevSts::VerifyXml(sent, signer);
+    EXPECT_TRUE(result) << result.reason;
+    const auto& travelled =
+        operation == Operation::Certificate ? *arguments.spec.actAsToken : arguments.token;
+    EXPECT_EQ(CreateSamlToken(sent, TrustSigner(signer).get())->Id(), travelled->Id());
+  }
+}
+
+using DevSts::AssertionOptions;
+
+INSTANTIATE_TEST_SUITE_P(
+    Shapes, TravellingTokenShapesTest,
+    ::testing::Values(Shape{"Plain", [](AssertionOptions&) {}},
+                      Shape{"InheritedNamespaces",
+                            [](AssertionOptions& options) { options.inheritNamespaces = true; }},
+                      Shape{"Indented", [](AssertionOptions& options) { options.indent = true; }},
+                      Shape{"InheritedAndIndented",
+                            [](AssertionOptions& options) {
+                              options.inheritNamespaces = true;
+                              options.indent = true;
+                            }},
+                      Shape{"WithoutKeyInfo",
+                            [](AssertionOptions& options) {
+                              options.signing.keyInfo = DevSts::KeyInfoContent::None;
+                            }},
+                      Shape{"KeyValue",
+                            [](AssertionOptions& options) {
+                              options.signing.keyInfo = DevSts::KeyInfoContent::KeyValue;
+                            }},
+                      Shape{"Sha512",
+                            [](AssertionOptions& options) {
+                              options.signing.signature = DevSts::SignatureAlgorithm::RsaSha512;
+                              options.signing.digest = DevSts::DigestAlgorithm::Sha512;
+                            }},
+                      Shape{"Pss",
+                            [](AssertionOptions& options) {
+                              options.signing.signature = DevSts::SignatureAlgorithm::RsaPssSha256;
+                            }},
+                      Shape{"WithoutTypesAndFormat",
+                            [](AssertionOptions& options) {
+                              options.attributeValueTypes = false;
+                              options.issuerFormat = false;
+                            }}),
+    [](const auto& tested) { return tested.param.name; });
+
+/// Ways in which a caller may come by a token other than as the answer of this service.
+class KeptTokenTest : public HolderOfKeyTest {
+ protected:
+  static void ExpectAccepted(std::shared_ptr<const SamlToken> token) {
+    Arguments arguments;
+    arguments.token = std::move(token);
+    const auto service = HolderService();
+    for (const Operation operation : {Operation::Token, Operation::Renew, Operation::Validate}) {
+      const Outcome outcome = CallNow(operation, *service, arguments);
+      EXPECT_TRUE(outcome.IsSuccess()) << operation << ": " << outcome.message;
+      EXPECT_NE(outcome.verdict, false);
+    }
+  }
+};
+
+TEST_F(KeptTokenTest, OfAFileWithDeclarationMarkAndCommentsIsAccepted) {
+  const std::string xml = AcquireBound()->Xml();
+  ExpectAccepted(CreateSamlToken("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<!-- kept -->\n" +
+                                 xml + "\n<!-- end -->\n"));
+  ExpectAccepted(CreateSamlToken("\xEF\xBB\xBF" + xml));
+}
+
+TEST_F(KeptTokenTest, WrittenInAnotherWayIsAccepted) {
+  std::string xml = AcquireBound()->Xml();
+  const auto replace = [&xml](const std::string& what, const std::string& by) {
+    const auto at = xml.find(what);
+    ASSERT_NE(at, std::string::npos) << what;
+    xml.replace(at, what.size(), by);
+  };
+  replace(">alice@EXAMPLE.COM<", "><![CDATA[alice]]>&#64;EXAMPLE.COM<");
+  replace("Version=\"2.0\"", "Version='2.0'");
+  replace("<saml2:Subject>", "<saml2:Subject  >");
+  ExpectAccepted(CreateSamlToken(xml));
+}
+
+TEST_F(KeptTokenTest, OfADocumentIsAccepted) {
+  const std::string xml =
+      "<a xmlns=\"urn:a\" xmlns:b=\"urn:b\"><b:c>" + AcquireBound()->Xml() + "</b:c></a>";
+  const auto reader = Tarnik::CreateStringReader(xml);
+  const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
+  const auto parsed = Tarnik::Xml::CreateXMLParser(reader.get(), handler.get())->Parse();
+  auto* root = Tarnik::CheckedCast<Tarnik::Xml::Document>(parsed.get())->RootElement();
+  const auto token =
+      CreateSamlTokenFromDom(root->FirstChildElement("c")->FirstChildElement("Assertion"));
+  EXPECT_NE(token->Xml().find("xmlns:b"), std::string::npos);
+  ExpectAccepted(token);
+}
+
+}  // namespace
+}  // namespace SsoClient::Tests

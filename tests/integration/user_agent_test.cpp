@@ -1,0 +1,125 @@
+// Holder-of-key operations over a user agent and connections of the caller's.
+#include <gmock/gmock.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/http_user_agent.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/system/tcp_client_socket.h>
+#include <tarnik/system/thread_pool.h>
+
+#include <set>
+
+#include "integration/holder_of_key_fixture.h"
+#include "integration/operation.h"
+
+namespace SsoClient::Tests {
+namespace {
+
+using ::testing::SizeIs;
+
+/// Connects to one port of this machine with TLS.
+class LoopbackTls final : public Tarnik::Http::CustomConnectionSpec, public Tarnik::ObjectImpl {
+ public:
+  LoopbackTls(Tarnik::Ref<Tarnik::Ssl::SSLContext> context, int port)
+      : context_(std::move(context)), port_(port) {}
+
+  std::string ToString() const override { return "LoopbackTls"; }
+  std::string Host() const override { return kHost; }
+  std::string CookieHost() const override { return kHost; }
+  std::string EndpointKey() const override { return kHost + (":" + std::to_string(port_)); }
+  bool IsProxy() const override { return false; }
+
+  Tarnik::Ref<Tarnik::System::CancellableItem> StartConnect(ConnectCompletion completion) override {
+    const auto socket =
+        Tarnik::System::CreateTCPClientSocket(Tarnik::System::GetThreadPool().get());
+    socket->ConnectAsync(kHost, port_,
+                         [context = context_, completion](
+                             Tarnik::System::TCPClientSocket* connected, Tarnik::Exception* error) {
+                           if (error != nullptr) {
+                             completion(connected, error);
+                             return;
+                           }
+                           const auto stream = context->WrapStream(connected, "");
+                           stream->HandshakeClientAsync(
+                               kHost, "", [stream, completion](Tarnik::Exception* failure) {
+                                 completion(stream.get(), failure);
+                               });
+                         });
+    return Tarnik::System::CreateCancellableItem([socket] {
+      socket->Close();
+      return true;
+    });
+  }
+
+ private:
+  static constexpr char kHost[] = "127.0.0.1";
+
+  Tarnik::Ref<Tarnik::Ssl::SSLContext> context_;
+  int port_;
+};
+
+class UserAgentTest : public HolderOfKeyTest {
+ protected:
+  static std::shared_ptr<SecurityTokenService> ServiceOver(Tarnik::Http::ConnectionPool* pool) {
+    const auto spec = Tarnik::MakeRef<LoopbackTls>(TrustCa(Sts()), Sts().HttpsPort());
+    SecurityTokenServiceConfigEx config;
+    config.url = "/sts";
+    config.userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, pool);
+    config.tokenFactory = CreateSamlTokenFactory(TrustSigner(Sts().SigningCertificatePem()).get());
+    config.holderOfKeyConfig = ConfigOf(Holder());
+    return CreateSecurityTokenService(config);
+  }
+};
+
+TEST_F(UserAgentTest, EveryOperationWorksOverOneConnection) {
+  const auto pool = Tarnik::Http::CreateConnectionPool();
+  const auto service = ServiceOver(pool.get());
+  Arguments arguments;
+  arguments.token = AcquireBound();
+  Sts().ClearRequests();
+  for (int round = 0; round < 2; ++round) {
+    for (const Operation operation : kOperations) {
+      const Outcome outcome = CallNow(operation, *service, arguments);
+      EXPECT_TRUE(outcome.IsSuccess()) << operation << ": " << outcome.message;
+    }
+  }
+  const auto requests = Sts().Requests();
+  ASSERT_THAT(requests, SizeIs(10));
+  std::set<std::uint64_t> connections;
+  for (const auto& request : requests) {
+    EXPECT_TRUE(request.overTls);
+    connections.insert(request.connectionId);
+  }
+  EXPECT_THAT(connections, SizeIs(1));
+}
+
+TEST_F(UserAgentTest, FaultLeavesTheConnectionUsable) {
+  const auto pool = Tarnik::Http::CreateConnectionPool();
+  const auto service = ServiceOver(pool.get());
+  Arguments arguments;
+  arguments.token = AcquireBound();
+  arguments.password = "wrong-secret";
+  EXPECT_EQ(CallNow(Operation::Password, *service, arguments).errorClass,
+            typeid(InvalidCredentialsException));
+  EXPECT_TRUE(CallNow(Operation::Renew, *service, arguments).IsSuccess());
+  EXPECT_EQ(Sts().LastRequest().ordinalOnConnection, 2U);
+}
+
+TEST_F(UserAgentTest, AsyncCallsInFlightShareTheUserAgent) {
+  const auto pool = Tarnik::Http::CreateConnectionPool();
+  auto service = ServiceOver(pool.get());
+  Arguments arguments;
+  arguments.token = AcquireBound();
+  std::vector<std::future<Outcome>> futures;
+  for (int i = 0; i < 100; ++i) {
+    futures.push_back(CallAsync(kOperations[i % std::size(kOperations)], *service, arguments));
+  }
+  service.reset();
+  for (auto& future : futures) {
+    ASSERT_EQ(future.wait_for(std::chrono::seconds(120)), std::future_status::ready);
+    const Outcome outcome = future.get();
+    EXPECT_TRUE(outcome.IsSuccess()) << outcome.message;
+  }
+}
+
+}  // namespace
+}  // namespace SsoClient::Tests

@@ -1,0 +1,29 @@
+#ifndef TESTS_INTEGRATION_WIRE_REQUEST_H
+#define TESTS_INTEGRATION_WIRE_REQUEST_H
+
+#include <string>
+#include <vector>
+
+namespace SsoClient::Tests {
+
+/// What tells requests apart, read from the octets that a server received.
+struct WireRequest {
+  /// Local names of the entries of the Security header, in order.
+  std::vector<std::string> securityEntries;
+  /// The local name of what the SecurityTokenReference of the signature's KeyInfo holds; empty
+  /// without a signature.
+  std::string keyReference;
+  /// "PublicKey" or "Bearer"; empty without a KeyType.
+  std::string keyType;
+  /// The Sig attribute of UseKey; empty without one.
+  std::string useKey;
+};
+
+WireRequest ReadWireRequest(const std::string& body);
+
+/// The octets of the first assertion in `text`.
+std::string AssertionIn(const std::string& text);
+
+}  // namespace SsoClient::Tests
+
+#endif
