@@ -156,6 +156,40 @@ TEST_F(HolderOfKeyFaultTest, RevokedActAsTokenIsRefused) {
   }
 }
 
+TEST_F(HolderOfKeyFaultTest, ForgedOrExpiredActAsTokenIsRefused) {
+  TokenSpec delegable = Bearer();
+  delegable.delegable = true;
+  const auto forged = Forged(*Acquire(delegable));
+  Sts().SetAssertionOptions(ValidBetween(seconds(-100), seconds(-10)));
+  const auto expired = Acquire(delegable);
+  Sts().SetAssertionOptions({});
+  Arguments arguments;
+  arguments.token = AcquireBound();
+  for (const Operation operation : {Operation::Certificate, Operation::Token}) {
+    arguments.spec.actAsToken = expired;
+    ExpectRejected(CallNow(operation, *HolderService(), arguments), "The ActAs token has expired");
+    arguments.spec.actAsToken = forged;
+    const Outcome outcome = CallNow(operation, *HolderService(), arguments);
+    ExpectRejected(outcome, Sts().LastRequest().answeredFault);
+    EXPECT_THAT(outcome.message,
+                StartsWith("Authentication failed: The ActAs token's signature does not verify: "));
+  }
+}
+
+TEST_F(HolderOfKeyFaultTest, EmptyActAsTokenIsRefusedBeforeAnythingIsSent) {
+  Arguments arguments;
+  arguments.token = AcquireBound();
+  arguments.spec.actAsToken = std::shared_ptr<const SamlToken>();
+  Sts().ClearRequests();
+  for (const Operation operation :
+       {Operation::Password, Operation::Certificate, Operation::Token}) {
+    ExpectFailure(CallNow(operation, *HolderService(), arguments),
+                  typeid(Tarnik::InvalidArgumentException),
+                  "TokenSpec::actAsToken is set, but holds no token");
+  }
+  EXPECT_TRUE(Sts().Requests().empty());
+}
+
 TEST_F(HolderOfKeyFaultTest, WhatIsNotDelegableIsNotDelegated) {
   Arguments arguments;
   arguments.token = AcquireBound(TenMinutes());
