@@ -48,7 +48,8 @@ TEST_P(RequestEscapingTest, KeepsMarkupAsText) {
   input.spec.tokenLifetimeSec = 60;
   GetParam().put(input);
   SoapRequest request;
-  RequestBuilderImpl(boost::none).BuildAcquireTokenRequest(input.user, input.password, input.spec, request);
+  RequestBuilderImpl(boost::none)
+      .BuildAcquireTokenRequest(input.user, input.password, input.spec, request);
   const std::string canonical =
       DevSts::Canonicalize(request.body, GetParam().element, DevSts::CanonicalMode::Exclusive);
   EXPECT_THAT(canonical, HasSubstr(GetParam().expected));
