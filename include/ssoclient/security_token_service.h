@@ -9,6 +9,7 @@
 #include <boost/optional.hpp>
 
 #include <ssoclient/exceptions.h>
+#include <ssoclient/negotiation_handler.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/security_token_service_config.h>
 #include <ssoclient/token_spec.h>
@@ -41,8 +42,9 @@ namespace SsoClient {
 ///
 /// Each asynchronous operation returns at once and reports to its callback, which must not be
 /// empty (`Tarnik::InvalidArgumentException`). Every failure of the operation itself goes to the
-/// callback. Arguments are copied, except tokens, which are taken by reference: the caller keeps
-/// them alive until the callback has run. The service may be released before.
+/// callback. Arguments are copied, except tokens and negotiation handlers, which are taken by
+/// reference: the caller keeps them alive until the callback has run. The service may be released
+/// before.
 class SecurityTokenService {
  public:
   /// Receives a token and null, or null and the exception, which is valid only during the call.
@@ -60,6 +62,13 @@ class SecurityTokenService {
   virtual std::shared_ptr<const SamlToken> AcquireToken(const std::string& userName,
                                                         const std::string& password,
                                                         const TokenSpec& spec) const = 0;
+  /// Asks for a token by a negotiated login (SPNego in WS-Trust 1.3, section 8): `handler` makes
+  /// the legs, all of which travel in one session with its cookies, each within 240 seconds. Bound
+  /// to the key as by `AcquireToken`. Throws `Tarnik::InvalidArgumentException` when the handler
+  /// returns null and `CommunicationException` when an answer names no negotiation; what the
+  /// handler throws passes through unchanged.
+  virtual std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec& spec,
+                                                             NegotiationHandler& handler) const = 0;
   /// Asks for a holder-of-key token for the owner of the configured certificate (Web Services
   /// Security: X.509 Token Profile 1.0). Throws `Tarnik::InvalidArgumentException` when the spec's
   /// confirmation is not `CONFIRMATION_DEFAULT`.
@@ -79,6 +88,8 @@ class SecurityTokenService {
 
   virtual void AcquireTokenAsync(const std::string& userName, const std::string& password,
                                  const TokenSpec& spec, TokenCallback callback) const = 0;
+  virtual void AcquireTokenByGSSAsync(const TokenSpec& spec, NegotiationHandler& handler,
+                                      TokenCallback callback) const = 0;
   virtual void AcquireTokenByCertificateAsync(const TokenSpec& spec,
                                               TokenCallback callback) const = 0;
   virtual void AcquireTokenByTokenAsync(const SamlToken& token, const TokenSpec& spec,

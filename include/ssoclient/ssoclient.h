@@ -7,7 +7,9 @@
 #include <ssoclient/confirmation_type.h>
 #include <ssoclient/delegate.h>
 #include <ssoclient/exceptions.h>
+#include <ssoclient/gss_negotiation_context.h>
 #include <ssoclient/holder_of_key_config.h>
+#include <ssoclient/negotiation_handler.h>
 #include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/saml_token_factory.h>

@@ -12,6 +12,8 @@ extern const Tarnik::Service::StaticLogger kLogger;
 
 /// The level of the lines that trace operations and requests.
 inline constexpr int kTraceLevel = 7;
+/// The level of the lines that warn of what a caller did.
+inline constexpr int kWarningLevel = 4;
 /// The level of the lines that tell of a success.
 inline constexpr int kSuccessLevel = 5;
 

@@ -3,6 +3,7 @@
 
 #include <cstdint>
 #include <string>
+#include <vector>
 
 #include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>
@@ -26,6 +27,14 @@ class RequestBuilder {
   /// A token by user name and password; signed if the token is to be bound to the key.
   virtual void BuildAcquireTokenRequest(const std::string& userName, const std::string& password,
                                         const TokenSpec& spec, SoapRequest& request) const = 0;
+  /// The first leg of a negotiation for a token; signed as a request by password is.
+  virtual void BuildInitialNegotiationRequest(const TokenSpec& spec,
+                                              const std::vector<unsigned char>& leg,
+                                              SoapRequest& request) const = 0;
+  /// A later leg of the negotiation that the service named `contextId`.
+  virtual void BuildContinuedNegotiationRequest(const std::string& contextId,
+                                                const std::vector<unsigned char>& leg,
+                                                SoapRequest& request) const = 0;
   /// A token by the certificate of the key. The spec's confirmation must be the default one.
   virtual void BuildAcquireTokenByCertificateRequest(const TokenSpec& spec,
                                                      SoapRequest& request) const = 0;

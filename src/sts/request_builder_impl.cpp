@@ -17,6 +17,8 @@
 #include "xml/signed_soap_builders.h"
 #include "xml/username_token.h"
 #include "xml/validate_body.h"
+#include "xml/xml_body_builder_continued_spnego.h"
+#include "xml/xml_body_builder_initial_spnego.h"
 
 namespace SsoClient {
 
@@ -27,6 +29,9 @@ using Builder = std::shared_ptr<XMLBaseBuilder>;
 constexpr char kIssueAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
 constexpr char kRenewAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Renew";
 constexpr char kValidateAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Validate";
+
+constexpr char kContinuedNegotiationAction[] =
+    "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RSTR/Issue";
 
 constexpr char kByCertificate[] = "acquire token by certificate";
 constexpr char kByToken[] = "acquire token by token";
@@ -100,9 +105,23 @@ void RequestBuilderImpl::BuildAcquireTokenRequest(const std::string& userName,
   CheckLifetime(spec.tokenLifetimeSec);
   const auto header = BuildHeader(BuildUsernamePasswordToken(userName, password));
   const auto body = BuildIssueBodyWithUseKey(AsksForHolderOfKey(spec) ? 1 : 0, spec);
-  const Builder envelope = IsSigned(spec) ? SignByCertificate(*holderOfKeyConfig_, header, body)
-                                          : BuildEnvelope(header, body);
-  Assign(kIssueAction, envelope, request);
+  Assign(kIssueAction, Enclose(spec, header, body), request);
+}
+
+void RequestBuilderImpl::BuildInitialNegotiationRequest(const TokenSpec& spec,
+                                                        const std::vector<unsigned char>& leg,
+                                                        SoapRequest& request) const {
+  CheckLifetime(spec.tokenLifetimeSec);
+  const auto body =
+      std::make_shared<XMLBodyBuilderInitialSPNego>(AsksForHolderOfKey(spec) ? 1 : 0, spec, leg);
+  Assign(kIssueAction, Enclose(spec, BuildHeader(), body), request);
+}
+
+void RequestBuilderImpl::BuildContinuedNegotiationRequest(const std::string& contextId,
+                                                          const std::vector<unsigned char>& leg,
+                                                          SoapRequest& request) const {
+  const auto body = std::make_shared<XMLBodyBuilderContinuedSPNego>(contextId, leg);
+  Assign(kContinuedNegotiationAction, BuildEnvelope(BuildHeader(), body), request);
 }
 
 void RequestBuilderImpl::BuildAcquireTokenByCertificateRequest(const TokenSpec& spec,
@@ -151,8 +170,13 @@ bool RequestBuilderImpl::AsksForHolderOfKey(const TokenSpec& spec) const {
 
 // A request on behalf of another's token is not signed, even when it asks for a holder-of-key
 // token.
-bool RequestBuilderImpl::IsSigned(const TokenSpec& spec) const {
-  return AsksForHolderOfKey(spec) && !spec.actAsToken;
+std::shared_ptr<XMLBaseBuilder> RequestBuilderImpl::Enclose(
+    const TokenSpec& spec, const std::shared_ptr<XMLBaseBuilder>& header,
+    const std::shared_ptr<XMLBaseBuilder>& body) const {
+  if (AsksForHolderOfKey(spec) && !spec.actAsToken) {
+    return SignByCertificate(*holderOfKeyConfig_, header, body);
+  }
+  return BuildEnvelope(header, body);
 }
 
 }  // namespace SsoClient

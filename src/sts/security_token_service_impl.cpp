@@ -4,6 +4,7 @@
 
 #include "describe/describe.h"
 #include "sts/logger.h"
+#include "sts/negotiation_leg.h"
 #include "sts/pass_by_ref_helper.h"
 #include "sts/secret_text.h"
 #include "sts/sync_to_async_call.h"
@@ -36,6 +37,34 @@ void Log(int level, std::string_view format, const Arguments&... arguments) {
   }
 }
 
+std::shared_ptr<const std::vector<unsigned char>> NextLeg(
+    NegotiationHandler& handler, const std::vector<unsigned char>& serverLeg) {
+  auto leg = handler.Negotiate(serverLeg);
+  if (leg == nullptr) {
+    throw Tarnik::InvalidArgumentException(
+        "Invalid NegotiationHandler: the returned leg may not be NULL");
+  }
+  return leg;
+}
+
+void CheckContextId(const NegotiationResponse& answer) {
+  if (answer.contextId.empty()) {
+    throw CommunicationException(
+        "Error processing the response to SPNego token request: no Context ID was returned.");
+  }
+}
+
+// The line says the opposite of what it is written for; readers of logs know it as it is.
+void HandOverLastLeg(NegotiationHandler& handler, const std::vector<unsigned char>& serverLeg) {
+  if (serverLeg.empty()) {
+    return;
+  }
+  const auto leg = handler.Negotiate(serverLeg);
+  if (leg == nullptr || leg->empty()) {
+    Log(kWarningLevel, "GSS contract error: non-empty user leg after negotiation is complete");
+  }
+}
+
 }  // namespace
 
 SecurityTokenServiceImpl::SecurityTokenServiceImpl(
@@ -59,6 +88,24 @@ TokenHandle SecurityTokenServiceImpl::AcquireToken(const std::string& userName,
   const auto response = Send(request);
   Log(kTraceLevel, "SecurityTokenServiceImpl::AcquireToken processing response");
   return MakeIssuedToken(response.get());
+}
+
+TokenHandle SecurityTokenServiceImpl::AcquireTokenByGSS(const TokenSpec& spec,
+                                                        NegotiationHandler& handler) const {
+  const OperationLog operation("AcquireTokenByGSS");
+  Log(kTraceLevel, "Requested token with spec `%1'", spec);
+  const auto session = transport_->CreateSession();
+  const NegotiationParts parts{*requestBuilder_, *session, *responseHandler_};
+  NegotiationResponse answer;
+  do {
+    const auto leg = NextLeg(handler, answer.leg);
+    answer = SendNegotiationLeg(parts, spec, answer.contextId, *leg);
+    CheckContextId(answer);
+  } while (answer.token.empty());
+  SecretText assertion;
+  assertion.text.swap(answer.token);
+  HandOverLastLeg(handler, answer.leg);
+  return MakeToken(assertion.text);
 }
 
 TokenHandle SecurityTokenServiceImpl::AcquireTokenByCertificate(const TokenSpec& spec) const {
@@ -107,6 +154,16 @@ void SecurityTokenServiceImpl::AcquireTokenAsync(const std::string& userName,
   SyncToAsyncCall<TokenHandle>(
       [service = Copy(), userName, secret = std::make_shared<const SecretText>(password), spec] {
         return service->AcquireToken(userName, secret->text, spec);
+      },
+      std::move(callback));
+}
+
+void SecurityTokenServiceImpl::AcquireTokenByGSSAsync(const TokenSpec& spec,
+                                                      NegotiationHandler& handler,
+                                                      TokenCallback callback) const {
+  SyncToAsyncCall<TokenHandle>(
+      [service = Copy(), spec, negotiating = PassByRefHelper(handler)] {
+        return service->AcquireTokenByGSS(spec, negotiating.Get());
       },
       std::move(callback));
 }

@@ -23,6 +23,8 @@ class SecurityTokenServiceImpl final : public SecurityTokenService {
   std::shared_ptr<const SamlToken> AcquireToken(const std::string& userName,
                                                 const std::string& password,
                                                 const TokenSpec& spec) const override;
+  std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec& spec,
+                                                     NegotiationHandler& handler) const override;
   std::shared_ptr<const SamlToken> AcquireTokenByCertificate(const TokenSpec& spec) const override;
   std::shared_ptr<const SamlToken> AcquireTokenByToken(const SamlToken& token,
                                                        const TokenSpec& spec) const override;
@@ -32,6 +34,8 @@ class SecurityTokenServiceImpl final : public SecurityTokenService {
 
   void AcquireTokenAsync(const std::string& userName, const std::string& password,
                          const TokenSpec& spec, TokenCallback callback) const override;
+  void AcquireTokenByGSSAsync(const TokenSpec& spec, NegotiationHandler& handler,
+                              TokenCallback callback) const override;
   void AcquireTokenByCertificateAsync(const TokenSpec& spec, TokenCallback callback) const override;
   void AcquireTokenByTokenAsync(const SamlToken& token, const TokenSpec& spec,
                                 TokenCallback callback) const override;

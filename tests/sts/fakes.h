@@ -1,6 +1,7 @@
 #ifndef SSOCLIENT_TESTS_STS_FAKES_H
 #define SSOCLIENT_TESTS_STS_FAKES_H
 
+#include <algorithm>
 #include <future>
 #include <memory>
 #include <mutex>
@@ -21,11 +22,12 @@
 
 namespace SsoClient::Testing {
 
-/// Records what is sent and answers each request with one text, or fails. Requests may be sent from
-/// many threads; the records are read when all is done.
+/// Records what is sent and answers each request with the next text, the last one again and again,
+/// or fails. Requests may be sent from many threads; the records are read when all is done.
 class FakeTransport final : public Transport {
  public:
-  explicit FakeTransport(std::string answer) : answer_(std::move(answer)) {}
+  explicit FakeTransport(std::string answer) : answers_{std::move(answer)} {}
+  explicit FakeTransport(std::vector<std::string> answers) : answers_(std::move(answers)) {}
 
   std::shared_ptr<TransportSession> CreateSession() const override {
     const std::lock_guard lock(mutex_);
@@ -45,11 +47,11 @@ class FakeTransport final : public Transport {
 
     void SendRequest(const SoapRequest& request,
                      Tarnik::Ref<Tarnik::Reader>& reader) const override {
-      transport_.Record(request);
+      const std::string& answer = transport_.Record(request);
       if (transport_.failure) {
         transport_.failure->Throw();
       }
-      reader = Tarnik::CreateStringReader(transport_.answer_);
+      reader = Tarnik::CreateStringReader(answer);
     }
 
     void SendRequestAsync(const SoapRequest&, const Completion&,
@@ -61,14 +63,16 @@ class FakeTransport final : public Transport {
     const FakeTransport& transport_;
   };
 
-  void Record(const SoapRequest& request) const {
+  /// The answer to the request that is recorded.
+  const std::string& Record(const SoapRequest& request) const {
     const std::lock_guard lock(mutex_);
     actions.push_back(request.action);
     bodies.push_back(request.body);
+    return answers_[std::min(bodies.size(), answers_.size()) - 1];
   }
 
   mutable std::mutex mutex_;
-  std::string answer_;
+  std::vector<std::string> answers_;
 };
 
 /// Makes a token of any text, or refuses all; from many threads, too.

@@ -274,35 +274,35 @@ TEST(HolderOfKeyOperationsTest, OperationsStandInTheirOrder) {
   const auto presented = Presented();
   const Testing::LogCapture log(7);
   const auto lastOperation = [&] { return log.Lines().back(); };
-  VtableSlot<Token(const void*, const TokenSpec&)>(object, 1)(object, OneHour());
+  VtableSlot<Token(const void*, const TokenSpec&)>(object, 2)(object, OneHour());
   EXPECT_EQ(lastOperation(), End("AcquireTokenByCertificate"));
-  VtableSlot<Token(const void*, const SamlToken&, const TokenSpec&)>(object, 2)(object, presented,
+  VtableSlot<Token(const void*, const SamlToken&, const TokenSpec&)>(object, 3)(object, presented,
                                                                                 OneHour());
   EXPECT_EQ(lastOperation(), End("AcquireTokenByToken"));
-  EXPECT_THROW((VtableSlot<bool(const void*, const SamlToken&)>(object, 3)(object, presented)),
+  EXPECT_THROW((VtableSlot<bool(const void*, const SamlToken&)>(object, 4)(object, presented)),
                SsoException);
   EXPECT_EQ(lastOperation(), End("ValidateSubject"));
-  EXPECT_THROW((VtableSlot<Token(const void*, const SamlToken&, std::int64_t)>(object, 4)(
+  EXPECT_THROW((VtableSlot<Token(const void*, const SamlToken&, std::int64_t)>(object, 5)(
                    object, presented, 60)),
                SsoException);
   EXPECT_EQ(lastOperation(), End("RenewToken"));
   Testing::AsyncCall byCertificate;
-  VtableSlot<void(const void*, const TokenSpec&, Callback)>(object, 6)(object, OneHour(),
+  VtableSlot<void(const void*, const TokenSpec&, Callback)>(object, 8)(object, OneHour(),
                                                                        byCertificate.Callback());
   EXPECT_NE(byCertificate.Wait().token, nullptr);
   Testing::AsyncCall byToken;
-  VtableSlot<void(const void*, const SamlToken&, const TokenSpec&, Callback)>(object, 7)(
+  VtableSlot<void(const void*, const SamlToken&, const TokenSpec&, Callback)>(object, 9)(
       object, presented, OneHour(), byToken.Callback());
   EXPECT_NE(byToken.Wait().token, nullptr);
   std::promise<std::string> verdict;
   VtableSlot<void(const void*, const SamlToken&, SecurityTokenService::ValidateCallback)>(
-      object, 8)(object, presented,
-                 [&verdict](const boost::optional<bool>&, const Tarnik::Exception* error) {
-                   verdict.set_value(typeid(*error).name());
-                 });
+      object, 10)(object, presented,
+                  [&verdict](const boost::optional<bool>&, const Tarnik::Exception* error) {
+                    verdict.set_value(typeid(*error).name());
+                  });
   EXPECT_EQ(verdict.get_future().get(), typeid(SsoException).name());
   Testing::AsyncCall renewal;
-  VtableSlot<void(const void*, const SamlToken&, std::int64_t, Callback)>(object, 9)(
+  VtableSlot<void(const void*, const SamlToken&, std::int64_t, Callback)>(object, 11)(
       object, presented, 60, renewal.Callback());
   EXPECT_EQ(renewal.Wait().errorType, typeid(SsoException).name());
 }

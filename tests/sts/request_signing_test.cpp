@@ -67,6 +67,12 @@ using Operation = std::function<void(const RequestBuilderImpl&, const TokenSpec&
 void ByPassword(const RequestBuilderImpl& builder, const TokenSpec& spec, SoapRequest& request) {
   builder.BuildAcquireTokenRequest("alice", "pw", spec, request);
 }
+void InitialLeg(const RequestBuilderImpl& builder, const TokenSpec& spec, SoapRequest& request) {
+  builder.BuildInitialNegotiationRequest(spec, {1}, request);
+}
+void ContinuedLeg(const RequestBuilderImpl& builder, const TokenSpec&, SoapRequest& request) {
+  builder.BuildContinuedNegotiationRequest("c", {1}, request);
+}
 void ByCertificate(const RequestBuilderImpl& builder, const TokenSpec& spec, SoapRequest& request) {
   builder.BuildAcquireTokenByCertificateRequest(spec, request);
 }
@@ -179,6 +185,16 @@ INSTANTIATE_TEST_SUITE_P(
                     true},
         SigningCase{"PasswordBearerActAs", ByPassword, true, kOther, true, kPlainPassword, kBearer,
                     false},
+        SigningCase{"InitialLegNoKey", InitialLeg, false, kDefault, false, kPlain, kBearer, false},
+        SigningCase{"InitialLegNoKeyActAs", InitialLeg, false, kDefault, true, kPlain, kBearer,
+                    false},
+        SigningCase{"InitialLeg", InitialLeg, true, kDefault, false, kByCertificate, kPublicKey,
+                    true},
+        SigningCase{"InitialLegBearer", InitialLeg, true, kOther, false, kPlain, kBearer, false},
+        SigningCase{"InitialLegActAs", InitialLeg, true, kDefault, true, kPlain, kPublicKey, true},
+        SigningCase{"ContinuedLegNoKey", ContinuedLeg, false, kDefault, false, kPlain, nullptr,
+                    false},
+        SigningCase{"ContinuedLeg", ContinuedLeg, true, kDefault, false, kPlain, nullptr, false},
         SigningCase{"CertificateNoKey",
                     ByCertificate,
                     false,
@@ -240,6 +256,8 @@ TEST(RequestSigningActionTest, EachOperationHasItsAction) {
     return request.action;
   };
   EXPECT_EQ(action(ByPassword), kIssueAction);
+  EXPECT_EQ(action(InitialLeg), kIssueAction);
+  EXPECT_EQ(action(ContinuedLeg), "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RSTR/Issue");
   EXPECT_EQ(action(ByCertificate), kIssueAction);
   EXPECT_EQ(action(ByToken), kIssueAction);
   EXPECT_EQ(action(Validate), kValidateAction);
@@ -250,7 +268,8 @@ TEST(RequestSigningOrderTest, TheLifetimeIsJudgedFirst) {
   for (const bool hasKey : {false, true}) {
     const auto builder = hasKey ? BuilderWithKey() : RequestBuilderImpl(boost::none);
     for (const Operation& operation :
-         {Operation(ByPassword), Operation(ByCertificate), Operation(ByToken), Operation(Renew)}) {
+         {Operation(ByPassword), Operation(InitialLeg), Operation(ByCertificate),
+          Operation(ByToken), Operation(Renew)}) {
       for (const std::int64_t seconds : {0, -1}) {
         SoapRequest request;
         EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
@@ -347,7 +366,8 @@ TEST(RequestSigningCertificateTest, AnExpiredCertificateSignsNothing) {
   const RequestBuilderImpl builder(
       Testing::ConfigOf(Testing::KeyCredential(DevSts::KeyType::Rsa2048, -2h, -1h)));
   for (const Operation& operation :
-       {Operation(ByPassword), Operation(ByCertificate), Operation(ByToken), Operation(Renew)}) {
+       {Operation(ByPassword), Operation(InitialLeg), Operation(ByCertificate), Operation(ByToken),
+        Operation(Renew)}) {
     SoapRequest request;
     EXPECT_THAT(
         ThrownMessage<InvalidStateException>([&] { operation(builder, SpecOf(60), request); }),
@@ -363,18 +383,25 @@ TEST(RequestSigningLayoutTest, OperationsStandInTheirOrder) {
   const auto builder = BuilderWithKey();
   const RequestBuilder& object = builder;
   SoapRequest request;
+  using Leg = std::vector<unsigned char>;
+  using Initial = void(const void*, const TokenSpec&, const Leg&, SoapRequest&);
+  TestSupport::VtableSlot<Initial>(&object, 1)(&object, SpecOf(60), {1}, request);
+  EXPECT_THAT(request.body, HasSubstr(" Context=\"urn:uuid:"));
+  using Continued = void(const void*, const std::string&, const Leg&, SoapRequest&);
+  TestSupport::VtableSlot<Continued>(&object, 2)(&object, "c", {1}, request);
+  EXPECT_THAT(request.body, HasSubstr(" Context=\"c\""));
   using BySpec = void(const void*, const TokenSpec&, SoapRequest&);
-  TestSupport::VtableSlot<BySpec>(&object, 1)(&object, SpecOf(60), request);
+  TestSupport::VtableSlot<BySpec>(&object, 3)(&object, SpecOf(60), request);
   EXPECT_THAT(HeaderOf(request.body), testing::ElementsAre(kTimestamp, kCertificate, kSignature));
   using ByTokenAndSpec = void(const void*, const SamlToken&, const TokenSpec&, SoapRequest&);
-  TestSupport::VtableSlot<ByTokenAndSpec>(&object, 2)(&object, PresentedToken(), SpecOf(60),
+  TestSupport::VtableSlot<ByTokenAndSpec>(&object, 4)(&object, PresentedToken(), SpecOf(60),
                                                       request);
   EXPECT_THAT(HeaderOf(request.body), testing::ElementsAre(kTimestamp, kAssertion, kSignature));
   using Validating = void(const void*, const SamlToken&, SoapRequest&);
-  TestSupport::VtableSlot<Validating>(&object, 3)(&object, PresentedToken(), request);
+  TestSupport::VtableSlot<Validating>(&object, 5)(&object, PresentedToken(), request);
   EXPECT_EQ(request.action, kValidateAction);
   using Renewing = void(const void*, const SamlToken&, std::int64_t, SoapRequest&);
-  TestSupport::VtableSlot<Renewing>(&object, 4)(&object, PresentedToken(), 60, request);
+  TestSupport::VtableSlot<Renewing>(&object, 6)(&object, PresentedToken(), 60, request);
   EXPECT_EQ(request.action, kRenewAction);
 }
 

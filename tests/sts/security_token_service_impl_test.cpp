@@ -230,7 +230,7 @@ TEST_F(SecurityTokenServiceImplTest, OperationsStandInTheirOrder) {
   using AcquireAsync = void(const void*, const std::string&, const std::string&, const TokenSpec&,
                             SecurityTokenService::TokenCallback);
   AsyncCall call;
-  TestSupport::VtableSlot<AcquireAsync>(object, 5)(object, "alice", "pw", OneHour(),
+  TestSupport::VtableSlot<AcquireAsync>(object, 6)(object, "alice", "pw", OneHour(),
                                                    call.Callback());
   EXPECT_NE(call.Wait().token, nullptr);
 }

@@ -1,0 +1,33 @@
+#include "sts/internal/gss_negotiation_context_impl.h"
+
+#include <utility>
+
+#include "sts/negotiation_leg.h"
+
+namespace SsoClient::InternalApi {
+
+GssNegotiationContextImpl::GssNegotiationContextImpl(
+    TokenSpec spec, std::shared_ptr<const RequestBuilder> requestBuilder,
+    std::shared_ptr<const TransportSession> session,
+    std::shared_ptr<const ResponseHandler> responseHandler,
+    Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> keyInfoResolver)
+    : spec_(std::move(spec)),
+      requestBuilder_(std::move(requestBuilder)),
+      session_(std::move(session)),
+      responseHandler_(std::move(responseHandler)),
+      keyInfoResolver_(std::move(keyInfoResolver)) {}
+
+GssNegotiationResult GssNegotiationContextImpl::Negotiate(
+    const std::vector<unsigned char>& inputLeg) {
+  NegotiationResponse answer = SendNegotiationLeg({*requestBuilder_, *session_, *responseHandler_},
+                                                  spec_, contextId_, inputLeg);
+  contextId_.swap(answer.contextId);
+  GssNegotiationResult result;
+  result.outputLeg = std::make_shared<std::vector<unsigned char>>(std::move(answer.leg));
+  if (!answer.token.empty()) {
+    result.token = CreateSamlToken(answer.token, keyInfoResolver_.get());
+  }
+  return result;
+}
+
+}  // namespace SsoClient::InternalApi
