@@ -1,0 +1,100 @@
+#include <devsts/kerberos_realm.h>
+
+#include <signal.h>
+
+#include <array>
+#include <cerrno>
+#include <chrono>
+#include <cstdio>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <memory>
+#include <stdexcept>
+
+namespace DevSts {
+namespace {
+
+using testing::HasSubstr;
+using namespace std::chrono_literals;
+
+struct Outcome {
+  std::string output;
+  int status = -1;
+};
+
+Outcome RunInRealm(const KerberosRealm& realm, const std::string& command) {
+  const std::string line = "KRB5_CONFIG=" + realm.ConfigPath() + " " + command + " 2>&1";
+  std::FILE* pipe = ::popen(line.c_str(), "r");
+  Outcome outcome;
+  std::array<char, 256> block;
+  while (std::fgets(block.data(), block.size(), pipe) != nullptr) {
+    outcome.output += block.data();
+  }
+  outcome.status = ::pclose(pipe);
+  return outcome;
+}
+
+TEST(KerberosRealmTest, GivesUsersAndServicesTickets) {
+  KerberosRealm realm;
+  realm.AddUser("alice", "secret");
+  const std::string keytab = realm.AddKeytab("HTTP/sts.example");
+  const std::string cache = realm.Login("alice", "secret");
+  const Outcome ticket =
+      RunInRealm(realm, "kvno -k " + keytab + " -c " + cache + " HTTP/sts.example");
+  EXPECT_EQ(ticket.status, 0) << ticket.output;
+  EXPECT_THAT(ticket.output, HasSubstr("keytab entry valid"));
+}
+
+TEST(KerberosRealmTest, RefusesAWrongPassword) {
+  KerberosRealm realm;
+  realm.AddUser("alice", "secret");
+  try {
+    realm.Login("alice", "guess");
+    FAIL() << "The login succeeded";
+  } catch (const std::runtime_error& error) {
+    EXPECT_THAT(error.what(), HasSubstr("Password incorrect"));
+  }
+}
+
+TEST(KerberosRealmTest, IssuesExpiredTicketsWithAClockThatIsSlow) {
+  KerberosRealm realm;
+  realm.AddUser("alice", "secret");
+  realm.SetClock(-1h);
+  const std::string cache = realm.Login("alice", "secret", 10min);
+  EXPECT_EQ(RunInRealm(realm, "klist -s -c " + cache).status, 1 << 8);
+  realm.SetClock(0s);
+  EXPECT_EQ(RunInRealm(realm, "klist -s -c " + realm.Login("alice", "secret")).status, 0);
+}
+
+TEST(KerberosRealmTest, DoesNotAnswerWithoutItsKdc) {
+  KerberosRealm realm;
+  realm.AddUser("alice", "secret");
+  realm.StopKdc();
+  EXPECT_THROW(realm.Login("alice", "secret"), std::runtime_error);
+}
+
+TEST(KerberosRealmTest, LeavesNothingBehind) {
+  std::string folder;
+  pid_t kdc = 0;
+  {
+    const KerberosRealm realm;
+    folder = realm.Folder();
+    kdc = realm.KdcProcess();
+    ASSERT_EQ(::kill(kdc, 0), 0);
+  }
+  EXPECT_FALSE(std::filesystem::exists(folder));
+  EXPECT_EQ(::kill(kdc, 0), -1);
+  EXPECT_EQ(errno, ESRCH);
+}
+
+TEST(KerberosRealmTest, RefusesNamesThatItsToolsWouldReadOtherwise) {
+  KerberosRealm realm;
+  for (const std::string name : {"", "a b", "a\"b", "-randkey", "a\nb"}) {
+    EXPECT_THROW(realm.AddUser(name, "secret"), std::runtime_error) << name;
+    EXPECT_THROW(realm.AddKeytab(name), std::runtime_error) << name;
+  }
+}
+
+}  // namespace
+}  // namespace DevSts
