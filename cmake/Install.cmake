@@ -1,14 +1,15 @@
 # ssoclient_install_package(NAME ... TARGET ... HEADERS ... DESCRIPTION ... [REQUIRES ...]): installs a shared library
-# with its headers, a CMake package and a pkg-config file.
+# with its headers, a CMake package and a pkg-config file, as a component with the package's name.
 function(ssoclient_install_package)
   cmake_parse_arguments(PACKAGE "" "NAME;TARGET;HEADERS;DESCRIPTION;REQUIRES" "" ${ARGN})
   set(cmake_dir "${CMAKE_INSTALL_LIBDIR}/cmake/${PACKAGE_NAME}")
 
   install(TARGETS ${PACKAGE_TARGET} EXPORT ${PACKAGE_NAME}Targets
-    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT ${PACKAGE_NAME})
   install(DIRECTORY ${PACKAGE_HEADERS} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
-    FILES_MATCHING PATTERN "*.h")
-  install(EXPORT ${PACKAGE_NAME}Targets NAMESPACE ${PACKAGE_NAME}:: DESTINATION ${cmake_dir})
+    COMPONENT ${PACKAGE_NAME} FILES_MATCHING PATTERN "*.h")
+  install(EXPORT ${PACKAGE_NAME}Targets NAMESPACE ${PACKAGE_NAME}:: DESTINATION ${cmake_dir}
+    COMPONENT ${PACKAGE_NAME})
 
   configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/${PACKAGE_NAME}Config.cmake.in"
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}Config.cmake" INSTALL_DESTINATION ${cmake_dir})
@@ -18,10 +19,10 @@ function(ssoclient_install_package)
   install(FILES
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}Config.cmake"
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"
-    DESTINATION ${cmake_dir})
+    DESTINATION ${cmake_dir} COMPONENT ${PACKAGE_NAME})
 
   configure_file("${PROJECT_SOURCE_DIR}/cmake/package.pc.in"
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc" @ONLY)
   install(FILES "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc"
-    DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
+    DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig" COMPONENT ${PACKAGE_NAME})
 endfunction()

@@ -1,0 +1,115 @@
+#include "gssapi_negotiation_handler_impl.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
+
+#include "gss_error.h"
+#include "gss_name.h"
+
+namespace SsoClient {
+
+namespace {
+
+using Leg = std::vector<unsigned char>;
+
+// Integrity lets SPNEGO protect the choice of the mechanism (RFC 4178, section 5).
+constexpr OM_uint32 kFlags = GSS_C_MUTUAL_FLAG | GSS_C_INTEG_FLAG;
+
+// One thread at a time: two would tear the negotiation apart.
+class Use {
+ public:
+  explicit Use(std::atomic_flag& isInUse) : isInUse_(isInUse) {
+    if (isInUse_.test_and_set(std::memory_order_acquire)) {
+      throw Tarnik::InvalidStateException("The negotiation handler is in use by another thread.");
+    }
+  }
+  Use(const Use&) = delete;
+  Use& operator=(const Use&) = delete;
+  ~Use() { isInUse_.clear(std::memory_order_release); }
+
+ private:
+  std::atomic_flag& isInUse_;
+};
+
+Leg BytesOf(const GssBuffer& buffer) {
+  const auto* bytes = static_cast<const unsigned char*>(buffer.Get().value);
+  return {bytes, bytes + buffer.Get().length};
+}
+
+}  // namespace
+
+GssapiNegotiationHandlerImpl::GssapiNegotiationHandlerImpl(const GssapiNegotiationConfig& config)
+    : targetService_(config.targetService),
+      source_{config.principal, config.keytab, config.credentialCache} {
+  ImportGssName(targetService_, GSS_C_NT_HOSTBASED_SERVICE, target_);
+  if (!source_.keytab.empty() && source_.cache.empty()) {
+    source_.cache = ownCache_.emplace().Name();
+  }
+}
+
+std::shared_ptr<const Leg> GssapiNegotiationHandlerImpl::Negotiate(const Leg& serverLeg) {
+  const Use use(isInUse_);
+  if (serverLeg.empty()) {
+    Begin();
+  }
+  if (state_ == State::kIdle) {
+    throw Tarnik::InvalidStateException(
+        "The negotiation handler is given a leg of the service's, but no negotiation is under "
+        "way.");
+  }
+  // The service may send a leg even when all is said.
+  if (state_ == State::kEstablished) {
+    return std::make_shared<const Leg>();
+  }
+  try {
+    return std::make_shared<const Leg>(NextLeg(serverLeg));
+  } catch (...) {
+    End(State::kIdle);
+    throw;
+  }
+}
+
+bool GssapiNegotiationHandlerImpl::IsEstablished() const {
+  return state_ == State::kEstablished;
+}
+
+void GssapiNegotiationHandlerImpl::Begin() {
+  End(State::kIdle);
+  AcquireCredentials(source_, credentials_);
+  state_ = State::kUnderWay;
+}
+
+// No message will be protected with the context's keys: they need not be kept.
+void GssapiNegotiationHandlerImpl::End(State state) noexcept {
+  context_.Reset();
+  credentials_.Reset();
+  state_ = state;
+}
+
+Leg GssapiNegotiationHandlerImpl::NextLeg(const Leg& serverLeg) {
+  const std::string attempt = "The login at `" + targetService_ + "' failed";
+  gss_buffer_desc input{serverLeg.size(), const_cast<unsigned char*>(serverLeg.data())};
+  GssBuffer output;
+  OM_uint32 granted = 0;
+  GssStatus status;
+  status.major = gss_init_sec_context(
+      &status.minor, credentials_.Get(), context_.Address(), target_.Get(), SpnegoMechanism(),
+      kFlags, 0, GSS_C_NO_CHANNEL_BINDINGS, serverLeg.empty() ? GSS_C_NO_BUFFER : &input, nullptr,
+      output.Address(), &granted, nullptr);
+  CheckGssStatus(attempt, status);
+  if ((status.major & GSS_S_CONTINUE_NEEDED) != 0) {
+    // Both sides would wait for each other.
+    if (output.Get().length == 0) {
+      throw SsoException(attempt + ": it is not complete, but there is nothing to send.");
+    }
+    return BytesOf(output);
+  }
+  if ((granted & GSS_C_MUTUAL_FLAG) == 0) {
+    throw SsoException(attempt + ": the service has not proved its identity.");
+  }
+  Leg leg = BytesOf(output);
+  End(State::kEstablished);
+  return leg;
+}
+
+}  // namespace SsoClient

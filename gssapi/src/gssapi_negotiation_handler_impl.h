@@ -1,0 +1,48 @@
+#ifndef SSOCLIENT_GSSAPI_GSSAPI_NEGOTIATION_HANDLER_IMPL_H
+#define SSOCLIENT_GSSAPI_GSSAPI_NEGOTIATION_HANDLER_IMPL_H
+
+#include <ssoclient/gssapi_negotiation_handler.h>
+
+#include <atomic>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "gss_credentials.h"
+#include "gss_handle.h"
+#include "memory_cache.h"
+
+namespace SsoClient {
+
+class GssapiNegotiationHandlerImpl final : public GssapiNegotiationHandler {
+ public:
+  /// `config` has been checked. Throws `SsoException` when the library cannot read the service's
+  /// name.
+  explicit GssapiNegotiationHandlerImpl(const GssapiNegotiationConfig& config);
+
+  std::shared_ptr<const std::vector<unsigned char>> Negotiate(
+      const std::vector<unsigned char>& serverLeg) override;
+  bool IsEstablished() const override;
+
+ private:
+  enum class State { kIdle, kUnderWay, kEstablished };
+
+  void Begin();
+  void End(State state) noexcept;
+  std::vector<unsigned char> NextLeg(const std::vector<unsigned char>& serverLeg);
+
+  const std::string targetService_;
+  GssName target_;
+  // Outlives the credentials, which hold it open.
+  std::optional<MemoryCache> ownCache_;
+  CredentialSource source_;
+  GssCredential credentials_;
+  GssContext context_;
+  State state_ = State::kIdle;
+  std::atomic_flag isInUse_ = ATOMIC_FLAG_INIT;
+};
+
+}  // namespace SsoClient
+
+#endif
