@@ -1,0 +1,48 @@
+// The receiving side: decides whether to let somebody in who comes with a token. The certificate is
+// the one with which the peer has proved its identity, in a TLS handshake for instance.
+#include <ssoclient/ssoclient.h>
+
+#include <cstring>
+#include <fstream>
+#include <iostream>
+#include <iterator>
+#include <set>
+#include <string>
+
+namespace {
+
+bool IsSame(const Tarnik::Crypto::Certificate& left, const Tarnik::Crypto::Certificate& right) {
+  return left.DerLength() == right.DerLength() &&
+         std::memcmp(left.DerBytes(), right.DerBytes(), left.DerLength()) == 0;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  if (argc != 5) {
+    std::cerr << "usage: check_token STS_CERTIFICATE_FILE TOKEN_FILE PEER_CERTIFICATE OWN_NAME\n";
+    return 2;
+  }
+  try {
+    const auto trustedKeys = Tarnik::Xml::Security::CreateTrustedCertificatesResolver(
+        Tarnik::Crypto::LoadCertificates(argv[1]));
+    std::ifstream file(argv[2]);
+    const std::string text(std::istreambuf_iterator<char>(file), {});
+    const auto peer = Tarnik::Crypto::LoadCertificates(argv[3]).front();
+
+    const auto token = SsoClient::CreateSamlToken(text, trustedKeys.get());
+    std::set<std::string> audiences;
+    token->GetAudiences(audiences);
+    const auto holder = token->HolderOfKeyCertificate();
+    if (!audiences.empty() && audiences.count(argv[4]) == 0) {
+      std::cout << "refused: the token is meant for others\n";
+    } else if (holder != nullptr && !IsSame(*holder, *peer)) {
+      std::cout << "refused: the token belongs to another key\n";
+    } else {
+      std::cout << "accepted: " << token->Subject().name << '@' << token->Subject().domain << '\n';
+    }
+  } catch (const std::exception& e) {
+    std::cout << "refused: " << e.what() << '\n';
+  }
+  return 0;
+}

@@ -1,0 +1,39 @@
+// Sends the library's log lines, down to the steps of each operation, where the server logs.
+#include <ssoclient/ssoclient.h>
+#include <tarnik/service/log.h>
+
+#include <iostream>
+#include <string>
+
+int main(int argc, char** argv) {
+  if (argc != 5) {
+    std::cerr << "usage: log_operations URL CA_FILE STS_CERTIFICATE_FILE USER < password\n";
+    return 2;
+  }
+  std::string password;
+  std::getline(std::cin, password);
+  // Before other threads of the process use the library.
+  Tarnik::Service::SetLogLevel("SsoClient", 7);
+  Tarnik::Service::SetLogSink([](const Tarnik::Service::LogRecord& line) {
+    std::cout << '[' << line.level << "] " << line.text << '\n';
+  });
+  try {
+    Tarnik::Ssl::SSLContextConfig tls;
+    tls.caFiles = {argv[2]};
+    const auto sslContext = Tarnik::Ssl::CreateSSLContext(tls);
+    const auto trustedKeys = Tarnik::Xml::Security::CreateTrustedCertificatesResolver(
+        Tarnik::Crypto::LoadCertificates(argv[3]));
+    SsoClient::SecurityTokenServiceConfig config;
+    config.url = argv[1];
+    config.sslContext = sslContext.get();
+    config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
+
+    SsoClient::TokenSpec spec;
+    spec.tokenLifetimeSec = 3600;
+    SsoClient::CreateSecurityTokenService(config)->AcquireToken(argv[4], password, spec);
+    return 0;
+  } catch (const std::exception& e) {
+    std::cerr << "No token: " << e.what() << '\n';
+    return 1;
+  }
+}
