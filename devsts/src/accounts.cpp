@@ -63,6 +63,11 @@ std::pair<std::string, User> Accounts::OwnerOf(const std::string& certificatePem
   ThrowFailedAuthentication("The certificate is nobody's");
 }
 
+bool Accounts::Has(const std::string& name) const {
+  const std::lock_guard lock(mutex_);
+  return users_.count(name) != 0;
+}
+
 User Accounts::Find(const std::string& name) const {
   const std::lock_guard lock(mutex_);
   const auto found = users_.find(name);

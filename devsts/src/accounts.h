@@ -22,6 +22,7 @@ class Accounts {
   User Authenticate(const std::string& name, const std::string& password) const;
   // The user who has this certificate, with the name. Throws Fault.
   std::pair<std::string, User> OwnerOf(const std::string& certificatePem) const;
+  bool Has(const std::string& name) const;
   // A user of no properties if there is none of this name.
   User Find(const std::string& name) const;
 

@@ -43,6 +43,7 @@ bool Conversation::ServeOne() {
   if (outcome != HttpReader::Outcome::Request) {
     return false;
   }
+  Describe(request);
   const Misbehavior misbehavior = parts_.plan.TakeForRequest();
   const SoapReply reply = Decide(request, misbehavior);
   const WireAnswer wire = MakeWireAnswer(reply, misbehavior, keepAlive);
@@ -58,11 +59,10 @@ SoapReply Conversation::Decide(const ReceivedRequest& request,
   if (misbehavior.fault) {
     return Service::AnswerFault(*misbehavior.fault);
   }
-  return parts_.service.Answer(request);
+  return parts_.service.Answer(request, misbehavior.leg);
 }
 
-void Conversation::Record(ReceivedRequest& request, const SoapReply& reply, const WireAnswer& wire,
-                          const Misbehavior& misbehavior) {
+void Conversation::Describe(ReceivedRequest& request) {
   request.connectionId = id_;
   request.ordinalOnConnection = ++ordinal_;
   request.overTls = connection_.OverTls();
@@ -70,7 +70,12 @@ void Conversation::Record(ReceivedRequest& request, const SoapReply& reply, cons
   request.tlsVersion = connection_.TlsVersion();
   request.serverName = connection_.ServerName();
   request.peerCertificatePem = connection_.PeerCertificatePem();
+}
+
+void Conversation::Record(ReceivedRequest& request, const SoapReply& reply, const WireAnswer& wire,
+                          const Misbehavior& misbehavior) {
   request.signature = reply.signature;
+  request.leg = reply.leg;
   request.answeredStatus = wire.status;
   request.answeredFault = reply.faultString;
   if (parts_.onRequest) {
@@ -80,6 +85,9 @@ void Conversation::Record(ReceivedRequest& request, const SoapReply& reply, cons
     ++counters.requests;
     counters.tokensIssued += reply.holdsToken ? 1 : 0;
     counters.faults += reply.isFault ? 1 : 0;
+    counters.negotiations += request.leg && request.leg->ordinal == 1 ? 1 : 0;
+    counters.negotiationLegs += request.leg && request.leg->ordinal > 0 ? 1 : 0;
+    counters.negotiatedTokens += request.leg && reply.holdsToken ? 1 : 0;
     counters.delayed += misbehavior.delayBeforeAnswer.count() > 0 ? 1 : 0;
   });
 }

@@ -33,6 +33,8 @@ class Conversation {
   bool Begin();
   bool ServeOne();
   SoapReply Decide(const ReceivedRequest& request, const Misbehavior& misbehavior) const;
+  // Fills in what the connection tells.
+  void Describe(ReceivedRequest& request);
   void Record(ReceivedRequest& request, const SoapReply& reply, const WireAnswer& wire,
               const Misbehavior& misbehavior);
   void StallHere();

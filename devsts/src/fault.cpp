@@ -12,6 +12,10 @@ void ThrowFailedAuthentication(const std::string& faultString) {
   throw Fault(kTrustNamespace, "FailedAuthentication", faultString);
 }
 
+void ThrowRequestFailed(const std::string& faultString) {
+  throw Fault(kTrustNamespace, "RequestFailed", faultString);
+}
+
 void ThrowInvalidTimeRange(const std::string& faultString) {
   throw Fault(kTrustNamespace, "InvalidTimeRange", faultString);
 }

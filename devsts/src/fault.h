@@ -1,8 +1,10 @@
 #ifndef DEVSTS_FAULT_H
 #define DEVSTS_FAULT_H
 
+#include <memory>
 #include <stdexcept>
 #include <string>
+#include <utility>
 
 #include "devsts/misbehavior.h"
 
@@ -12,24 +14,22 @@ namespace DevSts {
 class Fault : public std::runtime_error {
  public:
   Fault(const char* codeNamespace, const char* codeName, const std::string& faultString)
-      : std::runtime_error(faultString), codeNamespace_(codeNamespace), codeName_(codeName) {}
+      : Fault(FaultAnswer{codeNamespace, codeName, faultString}) {}
+  explicit Fault(FaultAnswer answer)
+      : std::runtime_error(answer.faultString),
+        answer_(std::make_shared<const FaultAnswer>(std::move(answer))) {}
 
-  FaultAnswer Answer() const {
-    FaultAnswer answer;
-    answer.codeNamespace = codeNamespace_;
-    answer.codeName = codeName_;
-    answer.faultString = what();
-    return answer;
-  }
+  const FaultAnswer& Answer() const { return *answer_; }
 
  private:
-  const char* codeNamespace_;
-  const char* codeName_;
+  // Copied without failure, as an exception must be.
+  std::shared_ptr<const FaultAnswer> answer_;
 };
 
 // WS-Trust 1.3, section 11.
 [[noreturn]] void ThrowInvalidRequest(const std::string& faultString);
 [[noreturn]] void ThrowFailedAuthentication(const std::string& faultString);
+[[noreturn]] void ThrowRequestFailed(const std::string& faultString);
 [[noreturn]] void ThrowInvalidTimeRange(const std::string& faultString);
 [[noreturn]] void ThrowUnableToRenew(const std::string& faultString);
 // WS-Security 1.1, section 12.

@@ -14,6 +14,7 @@ namespace {
 
 constexpr char kPasswordClass[] =
     "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport";
+constexpr char kKerberosClass[] = "urn:oasis:names:tc:SAML:2.0:ac:classes:Kerberos";
 constexpr char kCertificateClass[] = "urn:oasis:names:tc:SAML:2.0:ac:classes:X509";
 
 // Who asks, and how far what it presents may be handed on.
@@ -160,19 +161,9 @@ void DelegateTo(const std::string& name, const Requester& requester, TokenConten
   content.delegates.push_back({name, content.issued});
 }
 
-}  // namespace
-
-std::string Issue(const CheckedRequest& checked, ServiceParts& parts) {
-  const IssueRequest request = ReadIssueRequest(checked.soap.bodyEntry, parts.identity.vendorHost);
-  RequireSensibleLifetime(request.created, request.expires);
-  if (request.created > checked.now + parts.clockSkew) {
-    ThrowInvalidTimeRange("The Lifetime begins in the future");
-  }
-  RequireProvenKey(request, checked.proof);
-
-  TokenContent content = ContentFor(request, checked);
+std::string IssueBy(Requester requester, TokenContent content, const IssueRequest& request,
+                    const CheckedRequest& checked, ServiceParts& parts, const ServerLeg& leg) {
   content.issuer = parts.identity.issuer;
-  Requester requester = Identify(content, checked, parts);
   if (request.actAs != nullptr) {
     ActAs(request.actAs, requester, content, checked, parts);
   }
@@ -182,7 +173,34 @@ std::string Issue(const CheckedRequest& checked, ServiceParts& parts) {
   if (request.delegateTo) {
     DelegateTo(*request.delegateTo, requester, content);
   }
-  return IssueAndRemember(std::move(content), checked, parts, TokenAnswer::Issued);
+  return IssueAndRemember(std::move(content), checked, parts, TokenAnswer::Issued, leg);
+}
+
+}  // namespace
+
+IssueRequest PrepareIssue(const CheckedRequest& checked, const ServiceParts& parts) {
+  IssueRequest request = ReadIssueRequest(checked.soap.bodyEntry, parts.identity.vendorHost);
+  RequireSensibleLifetime(request.created, request.expires);
+  if (request.created > checked.now + parts.clockSkew) {
+    ThrowInvalidTimeRange("The Lifetime begins in the future");
+  }
+  RequireProvenKey(request, checked.proof);
+  return request;
+}
+
+std::string IssueTo(const std::string& userName, const IssueRequest& request,
+                    const CheckedRequest& checked, ServiceParts& parts, const ServerLeg& leg) {
+  TokenContent content = ContentFor(request, checked);
+  content.subject = userName;
+  content.user = parts.accounts.Find(userName);
+  content.authenticationClass = kKerberosClass;
+  return IssueBy({userName, std::nullopt}, std::move(content), request, checked, parts, leg);
+}
+
+std::string Issue(const IssueRequest& request, const CheckedRequest& checked, ServiceParts& parts) {
+  TokenContent content = ContentFor(request, checked);
+  const Requester requester = Identify(content, checked, parts);
+  return IssueBy(requester, std::move(content), request, checked, parts, {});
 }
 
 }  // namespace DevSts

@@ -171,7 +171,6 @@ std::pair<Time, Time> ReadPeriod(xmlNode* element) {
 }
 
 IssueRequest ReadIssueRequest(xmlNode* requestSecurityToken, const std::string& vendorHost) {
-  RequireAttributes(requestSecurityToken, {});
   ElementReader reader(requestSecurityToken);
   IssueRequest request;
   RequireText(reader.Expect(kTrustNamespace, "TokenType"), kSamlNamespace);
@@ -184,6 +183,11 @@ IssueRequest ReadIssueRequest(xmlNode* requestSecurityToken, const std::string& 
   request.delegable =
       BooleanOf(PlainText(reader.Expect(kTrustNamespace, "Delegatable")), "Delegatable");
   ReadOptionalParts(reader, vendorHost, request);
+  if (xmlNode* exchange = reader.Optional(kTrustNamespace, "BinaryExchange")) {
+    request.leg = ReadLeg(requestSecurityToken, exchange);
+  } else {
+    RequireAttributes(requestSecurityToken, {});
+  }
   reader.End();
   return request;
 }

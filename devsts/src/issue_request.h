@@ -9,6 +9,7 @@
 #include <utility>
 #include <vector>
 
+#include "binary_exchange.h"
 #include "time_text.h"
 
 namespace DevSts {
@@ -30,6 +31,7 @@ struct IssueRequest {
   std::vector<std::string> audiences;
   std::vector<AdviceRequest> advice;
   bool usesKey = false;  // wst:UseKey names the request's signature (WS-Trust 1.3, section 9.2)
+  std::optional<NegotiationLeg> leg;  // the first one of a negotiation
 };
 
 // Throws Fault for anything missing, unknown or out of order.

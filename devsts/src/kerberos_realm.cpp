@@ -152,8 +152,10 @@ class KerberosRealm::State {
     WriteFile(configPath, "[libdefaults]\n default_realm = " + realm +
                               "\n dns_lookup_kdc = false\n dns_lookup_realm = false\n"
                               " dns_canonicalize_hostname = false\n rdns = false\n"
-                              " udp_preference_limit = 1\n kdc_timesync = 0\n[realms]\n " +
-                              realm + " = {\n  kdc = " + address + "\n }\n");
+                              " udp_preference_limit = 1\n kdc_timesync = 0\n"
+                              " default_rcache_name = file2:" +
+                              folder + "/replays\n[realms]\n " + realm +
+                              " = {\n  kdc = " + address + "\n }\n");
     WriteFile(folder + "/kdc.conf",
               "[kdcdefaults]\n kdc_listen = \"\"\n kdc_tcp_listen = " + address + "\n[realms]\n " +
                   realm + " = {\n  database_name = " + folder + "/principal\n  key_stash_file = " +

@@ -2,6 +2,7 @@
 
 #include <stdexcept>
 
+#include "base64.h"
 #include "certificate_values.h"
 #include "element_reader.h"
 #include "fault.h"
@@ -13,9 +14,6 @@ namespace DevSts {
 namespace {
 
 constexpr char kCertificateId[] = "holderOfKeyCertificate";
-constexpr char kBase64Binary[] =
-    "http://docs.oasis-open.org/wss/2004/01/"
-    "oasis-200401-wss-soap-message-security-1.0#Base64Binary";
 constexpr char kX509Token[] =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-x509-token-profile-1.0#X509v3";
 constexpr char kSamlTokenType[] =

@@ -27,8 +27,8 @@ std::string MakeId() {
 }
 
 std::string IssueAndRemember(TokenContent content, const CheckedRequest& request,
-                             ServiceParts& parts, TokenAnswer kind) {
-  IssuedAnswer answer = IssueToken(content, request.shape, parts.identity, kind);
+                             ServiceParts& parts, TokenAnswer kind, const ServerLeg& leg) {
+  IssuedAnswer answer = IssueToken(content, request.shape, parts.identity, kind, leg);
   parts.tokens.Remember(answer.assertionId, std::move(content));
   return std::move(answer.envelope);
 }

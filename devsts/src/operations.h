@@ -6,6 +6,7 @@
 #include <string>
 
 #include "accounts.h"
+#include "issue_request.h"
 #include "request_signature.h"
 #include "security_header.h"
 #include "soap_request.h"
@@ -31,8 +32,15 @@ struct CheckedRequest {
   Time now;
 };
 
+// Reads an Issue request and judges all but who makes it. Throws Fault.
+IssueRequest PrepareIssue(const CheckedRequest& request, const ServiceParts& parts);
+
+// Issues to the user who logged in by a negotiation, which ends with this leg. Throws Fault.
+std::string IssueTo(const std::string& userName, const IssueRequest& issue,
+                    const CheckedRequest& request, ServiceParts& parts, const ServerLeg& leg);
+
 // Each gives the answer's envelope or throws Fault.
-std::string Issue(const CheckedRequest& request, ServiceParts& parts);
+std::string Issue(const IssueRequest& issue, const CheckedRequest& request, ServiceParts& parts);
 std::string Renew(const CheckedRequest& request, ServiceParts& parts);
 std::string Validate(const CheckedRequest& request, const ServiceParts& parts);
 
@@ -41,7 +49,7 @@ std::string MakeId();
 
 // Issues an assertion of this content and remembers it.
 std::string IssueAndRemember(TokenContent content, const CheckedRequest& request,
-                             ServiceParts& parts, TokenAnswer kind);
+                             ServiceParts& parts, TokenAnswer kind, const ServerLeg& leg = {});
 
 // The end of a token that begins at `from`.
 Time GrantedEnd(Time from, std::chrono::milliseconds asked, const AssertionOptions& shape);

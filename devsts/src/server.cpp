@@ -158,6 +158,14 @@ void Server::SetAssertionOptions(AssertionOptions options) {
   impl_->service.SetAssertionOptions(std::move(options));
 }
 
+void Server::SetNegotiationScript(NegotiationScript script) {
+  impl_->service.SetNegotiationScript(std::move(script));
+}
+
+std::size_t Server::OpenNegotiations() const {
+  return impl_->service.OpenNegotiations();
+}
+
 void Server::SetMisbehavior(Misbehavior misbehavior) {
   impl_->plan.Set(std::move(misbehavior));
 }

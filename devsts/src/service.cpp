@@ -1,7 +1,9 @@
 #include "service.h"
 
+#include <array>
 #include <utility>
 
+#include "binary_exchange.h"
 #include "fault.h"
 #include "key_reference.h"
 #include "namespaces.h"
@@ -13,7 +15,46 @@
 namespace DevSts {
 namespace {
 
-constexpr char kActions[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/";
+constexpr char kActions[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/";
+
+enum class Operation { Issue, Continue, Renew, Validate };
+
+Operation OperationOf(const std::string& action) {
+  const std::string actions = kActions;
+  const std::array<std::pair<const char*, Operation>, 4> operations{{
+      {"RST/Issue", Operation::Issue},
+      {"RSTR/Issue", Operation::Continue},
+      {"RST/Renew", Operation::Renew},
+      {"RST/Validate", Operation::Validate},
+  }};
+  for (const auto& [name, operation] : operations) {
+    if (action == actions + name) {
+      return operation;
+    }
+  }
+  ThrowInvalidRequest("Unsupported SOAPAction: " + action);
+}
+
+SoapReply TokenReply(std::string envelope) {
+  SoapReply reply;
+  reply.envelope = std::move(envelope);
+  reply.holdsToken = true;
+  return reply;
+}
+
+SoapReply ReplyOf(LegReply leg) {
+  SoapReply reply;
+  reply.envelope = std::move(leg.envelope);
+  reply.holdsToken = leg.holdsToken;
+  if (!leg.setCookie.empty()) {
+    reply.setCookies.push_back(std::move(leg.setCookie));
+  }
+  return reply;
+}
+
+ReceivedLeg Seeing(const NegotiationLeg& leg) {
+  return {leg.context, 0, std::string(leg.octets.begin(), leg.octets.end())};
+}
 
 void RequireFresh(const SecurityHeader& header, Time now, std::chrono::seconds skew) {
   if (header.created > now + skew) {
@@ -34,45 +75,70 @@ Service::Service(const ServerOptions& options, Credential signing)
              {options.issuer, options.vendorHost, options.solutionHost, std::move(signing)},
              Accounts(options.users),
              TokenStore(options.issuedTokenLimit)},
+      negotiator_(options.negotiation),
       shape_(options.assertion) {}
 
-SoapReply Service::Answer(const ReceivedRequest& request) {
-  RequestSignature seen = RequestSignature::None;
+SoapReply Service::Answer(const ReceivedRequest& request, const LegMisbehavior& misbehavior) {
+  Seen seen;
   SoapReply reply;
   try {
-    reply = Handle(request, seen);
+    reply = Handle(request, misbehavior, seen);
   } catch (const Fault& fault) {
     reply = AnswerFault(fault.Answer());
   } catch (const std::exception& error) {
     reply = AnswerFault(
         {kSoapNamespace, "Server", std::string("The service failed: ") + error.what(), false, 500});
   }
-  reply.signature = seen;
+  reply.signature = seen.signature;
+  reply.leg = std::move(seen.leg);
   return reply;
 }
 
-SoapReply Service::Handle(const ReceivedRequest& received, RequestSignature& seen) {
-  const std::string action = ReadSoapAction(received);
-  const bool issues = action == std::string(kActions) + "Issue";
-  const bool renews = action == std::string(kActions) + "Renew";
-  const bool validates = action == std::string(kActions) + "Validate";
-  if (!issues && !renews && !validates) {
-    ThrowInvalidRequest("Unsupported SOAPAction: " + action);
+SoapReply Service::Handle(const ReceivedRequest& received, const LegMisbehavior& misbehavior,
+                          Seen& seen) {
+  const Operation operation = OperationOf(ReadSoapAction(received));
+  const bool continues = operation == Operation::Continue;
+  CheckedRequest request =
+      Check(received, continues ? "RequestSecurityTokenResponse" : "RequestSecurityToken", seen);
+  if (operation == Operation::Issue) {
+    return AnswerIssue(std::move(request), received, misbehavior, seen);
   }
-  CheckedRequest request{ReadEnvelope(received.body), {}, {}, Shape(), Now()};
+  if (continues) {
+    return AnswerContinued(request, received, misbehavior, seen);
+  }
+  if (operation == Operation::Renew) {
+    return TokenReply(Renew(request, parts_));
+  }
+  SoapReply reply;
+  reply.envelope = Validate(request, parts_);
+  return reply;
+}
+
+CheckedRequest Service::Check(const ReceivedRequest& received, const char* entryName,
+                              Seen& seen) const {
+  CheckedRequest request{ReadEnvelope(received.body, entryName), {}, {}, Shape(), Now()};
   request.header = ReadSecurityHeader(request.soap.header);
-  seen = SignatureFormOf(request.header);
+  seen.signature = SignatureFormOf(request.header);
   RequireFresh(request.header, request.now, parts_.clockSkew);
   request.proof = CheckRequestSignature(request.soap, request.header);
+  return request;
+}
 
-  SoapReply reply;
-  reply.holdsToken = !validates;
-  if (validates) {
-    reply.envelope = Validate(request, parts_);
-  } else {
-    reply.envelope = renews ? Renew(request, parts_) : Issue(request, parts_);
+SoapReply Service::AnswerIssue(CheckedRequest request, const ReceivedRequest& received,
+                               const LegMisbehavior& misbehavior, Seen& seen) {
+  IssueRequest issue = PrepareIssue(request, parts_);
+  if (!issue.leg) {
+    return TokenReply(Issue(issue, request, parts_));
   }
-  return reply;
+  seen.leg = Seeing(*issue.leg);
+  return ReplyOf(negotiator_.Begin(std::move(request), std::move(issue), received, misbehavior,
+                                   parts_, *seen.leg));
+}
+
+SoapReply Service::AnswerContinued(const CheckedRequest& request, const ReceivedRequest& received,
+                                   const LegMisbehavior& misbehavior, Seen& seen) {
+  seen.leg = Seeing(ReadContinuedLeg(request.soap.bodyEntry));
+  return ReplyOf(negotiator_.Continue(request, received, misbehavior, parts_, *seen.leg));
 }
 
 SoapReply Service::AnswerFault(const FaultAnswer& fault) {

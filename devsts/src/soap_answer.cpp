@@ -1,5 +1,7 @@
 #include "soap_answer.h"
 
+#include "base64.h"
+#include "binary_exchange.h"
 #include "namespaces.h"
 
 namespace DevSts {
@@ -13,6 +15,18 @@ std::string PrefixFor(const std::string& namespaceUri) {
     return "wsse";
   }
   return namespaceUri == kWsuNamespace ? "wsu" : "code";
+}
+
+XmlWriter::Attributes ContextOf(const ServerLeg& leg) {
+  return leg.context ? XmlWriter::Attributes{{"Context", *leg.context}} : XmlWriter::Attributes();
+}
+
+void WriteExchange(const ServerLeg& leg, XmlWriter& xml) {
+  if (leg.octets) {
+    xml.Leaf("wst:BinaryExchange",
+             {{"EncodingType", kBase64Binary}, {"ValueType", kSpnegoValueType}},
+             leg.octets->empty() ? std::string() : ToBase64(*leg.octets));
+  }
 }
 
 }  // namespace
@@ -39,8 +53,8 @@ std::string WriteFaultEnvelope(const FaultAnswer& fault) {
 }
 
 std::string WriteTokenEnvelope(TokenAnswer kind, const std::string& assertion, Time created,
-                               Time expires, const XmlWriter::Attributes& declarations,
-                               bool indent) {
+                               Time expires, const XmlWriter::Attributes& declarations, bool indent,
+                               const ServerLeg& leg) {
   XmlWriter xml(indent);
   XmlWriter::Attributes attributes{{"xmlns:soapenv", kSoapNamespace}};
   attributes.insert(attributes.end(), declarations.begin(), declarations.end());
@@ -49,7 +63,7 @@ std::string WriteTokenEnvelope(TokenAnswer kind, const std::string& assertion, T
   if (kind == TokenAnswer::Issued) {
     xml.Open("wst:RequestSecurityTokenResponseCollection");
   }
-  xml.Open("wst:RequestSecurityTokenResponse");
+  xml.Open("wst:RequestSecurityTokenResponse", ContextOf(leg));
   xml.Leaf("wst:TokenType", kSamlNamespace);
   xml.Open("wst:Lifetime", {{"xmlns:wsu", kWsuNamespace}});
   xml.Leaf("wsu:Created", TimeToText(created));
@@ -58,10 +72,23 @@ std::string WriteTokenEnvelope(TokenAnswer kind, const std::string& assertion, T
   xml.Open("wst:RequestedSecurityToken");
   xml.Raw(assertion);
   xml.Close();
+  WriteExchange(leg, xml);
   xml.Close();
   if (kind == TokenAnswer::Issued) {
     xml.Close();
   }
+  xml.Close();
+  xml.Close();
+  return xml.Text();
+}
+
+std::string WriteLegEnvelope(const ServerLeg& leg) {
+  XmlWriter xml;
+  xml.Open("soapenv:Envelope", {{"xmlns:soapenv", kSoapNamespace}});
+  xml.Open("soapenv:Body", {{"xmlns:wst", kTrustNamespace}});
+  xml.Open("wst:RequestSecurityTokenResponse", ContextOf(leg));
+  WriteExchange(leg, xml);
+  xml.Close();
   xml.Close();
   xml.Close();
   return xml.Text();

@@ -1,10 +1,12 @@
 #ifndef DEVSTS_SOAP_ANSWER_H
 #define DEVSTS_SOAP_ANSWER_H
 
+#include <optional>
 #include <string>
 
 #include "assertion_writer.h"
 #include "devsts/misbehavior.h"
+#include "octets.h"
 
 namespace DevSts {
 
@@ -17,11 +19,20 @@ enum class TokenAnswer {
   Renewed,  // alone
 };
 
+// What a service says in a negotiation (WS-Trust 1.3, section 8).
+struct ServerLeg {
+  std::optional<std::string> context;
+  std::optional<Octets> octets;
+};
+
+// The envelope of an answer that asks for the next leg.
+std::string WriteLegEnvelope(const ServerLeg& leg);
+
 // The envelope of an answer around the assertion's markup, which is put in as it stands.
-// `declarations` go onto the envelope.
+// `declarations` go onto the envelope. `leg` is that of a negotiation that ends with it.
 std::string WriteTokenEnvelope(TokenAnswer kind, const std::string& assertion, Time created,
-                               Time expires, const XmlWriter::Attributes& declarations,
-                               bool indent);
+                               Time expires, const XmlWriter::Attributes& declarations, bool indent,
+                               const ServerLeg& leg = {});
 
 // The envelope of a Validate answer (WS-Trust 1.3, section 7).
 std::string WriteStatusEnvelope(bool valid, const std::string& reason);

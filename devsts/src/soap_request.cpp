@@ -54,7 +54,7 @@ std::string ReadSoapAction(const ReceivedRequest& request) {
   return action.substr(1, action.size() - 2);
 }
 
-SoapRequest ReadEnvelope(const std::string& body) {
+SoapRequest ReadEnvelope(const std::string& body, const char* entryName) {
   SoapRequest request{ParseEnvelope(body)};
   xmlNode* envelope = xmlDocGetRootElement(request.document.get());
   if (!IsElement(envelope, kSoapNamespace, "Envelope")) {
@@ -70,7 +70,7 @@ SoapRequest ReadEnvelope(const std::string& body) {
   if (bodyReader.AtEnd()) {
     ThrowInvalidRequest("The Body is empty");
   }
-  request.bodyEntry = bodyReader.Expect(kTrustNamespace, "RequestSecurityToken");
+  request.bodyEntry = bodyReader.Expect(kTrustNamespace, entryName);
   bodyReader.End();
   return request;
 }

@@ -20,8 +20,9 @@ struct SoapRequest {
 // Throws Fault.
 std::string ReadSoapAction(const ReceivedRequest& request);
 
-// The ids of the document are registered with it afterwards. Throws Fault.
-SoapRequest ReadEnvelope(const std::string& body);
+// The Body must hold a WS-Trust element of this name alone. The ids of the document are registered
+// with it afterwards. Throws Fault.
+SoapRequest ReadEnvelope(const std::string& body, const char* entryName);
 
 }  // namespace DevSts
 

@@ -35,7 +35,7 @@ void EditAssertion(std::string& envelope, const std::function<void(std::string&)
 }  // namespace
 
 IssuedAnswer IssueToken(const TokenContent& content, const AssertionOptions& shape,
-                        const IssuerIdentity& identity, TokenAnswer kind) {
+                        const IssuerIdentity& identity, TokenAnswer kind, const ServerLeg& leg) {
   std::string assertion =
       WriteAssertion(content, shape, identity.vendorHost, identity.solutionHost);
   if (shape.beforeSigning) {
@@ -51,7 +51,7 @@ IssuedAnswer IssueToken(const TokenContent& content, const AssertionOptions& sha
     signing.id = answer.assertionId;
   }
   const std::string unsignedEnvelope = WriteTokenEnvelope(
-      kind, assertion, content.notBefore, content.notOnOrAfter, declarations, shape.indent);
+      kind, assertion, content.notBefore, content.notOnOrAfter, declarations, shape.indent, leg);
   answer.envelope = SignXml(unsignedEnvelope, identity.signing.privateKeyPem,
                             identity.signing.certificatePem, signing);
   if (shape.afterSigning) {

@@ -25,7 +25,8 @@ struct IssuedAnswer {
 // Makes the envelope of an answer with a signed assertion. The signature is made in its place, so
 // that it holds there under inclusive canonical form, too.
 IssuedAnswer IssueToken(const TokenContent& content, const AssertionOptions& shape,
-                        const IssuerIdentity& identity, TokenAnswer kind);
+                        const IssuerIdentity& identity, TokenAnswer kind,
+                        const ServerLeg& leg = {});
 
 }  // namespace DevSts
 

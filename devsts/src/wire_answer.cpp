@@ -23,6 +23,9 @@ HttpAnswer AsHttp(SoapReply reply, const Misbehavior& misbehavior) {
   answer.status = reply.status;
   answer.reason = reply.status == 200 ? "OK" : "Internal Server Error";
   answer.headers = {{"Content-Type", "text/xml; charset=utf-8"}};
+  for (const std::string& cookie : reply.setCookies) {
+    answer.headers.emplace_back("Set-Cookie", cookie);
+  }
   answer.body = std::move(reply.envelope);
   return answer;
 }

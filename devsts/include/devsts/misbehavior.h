@@ -61,6 +61,23 @@ struct Drip {
   std::chrono::milliseconds interval{100};  ///< pause between them
 };
 
+/// What is wrong with the answer to a leg of a negotiation that is not answered with a fault.
+struct LegMisbehavior {
+  /// Answers with this Context, empty as well. If the negotiation goes on, it does so by this
+  /// Context alone; with an empty one, it does not.
+  std::optional<std::string> context;
+  /// Writes no Context at all.
+  bool omitContext = false;
+  /// Answers with these octets in BinaryExchange, none as well.
+  std::optional<std::string> leg;
+  /// Writes no BinaryExchange.
+  bool omitLeg = false;
+  /// Sets no cookie, and yet demands it.
+  bool omitCookie = false;
+  /// Forgets the negotiation.
+  bool forget = false;
+};
+
 struct Misbehavior {
   /// Answers with this fault, whatever the request.
   std::optional<FaultAnswer> fault;
@@ -74,6 +91,8 @@ struct Misbehavior {
   /// Changes the SOAP envelope of whatever is answered; may run on several threads at once.
   /// If it throws, the connection is closed without an answer.
   std::function<void(std::string& envelope)> editEnvelope;
+  /// For a request that is a leg of a negotiation and is answered by the service.
+  LegMisbehavior leg;
 
   /// Further header fields of the answer; one Set-Cookie field for each of `setCookies`.
   std::vector<std::pair<std::string, std::string>> extraHeaders;

@@ -6,12 +6,14 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include "devsts/certificates.h"
 #include "devsts/misbehavior.h"
+#include "devsts/negotiation.h"
 #include "devsts/users.h"
 #include "devsts/xml_security.h"
 
@@ -111,6 +113,7 @@ struct ServerOptions {
   std::chrono::seconds clockSkew{60};
   AssertionOptions assertion;
   TlsOptions tls;
+  NegotiationOptions negotiation;
   /// Remembers at most this many issued tokens (the oldest are forgotten first). A forgotten token
   /// is refused.
   std::size_t issuedTokenLimit = 8192;
@@ -126,6 +129,14 @@ enum class RequestSignature {
   ByCertificate,  ///< a BinarySecurityToken (X.509 Token Profile 1.1, section 3.2)
   ByToken,        ///< an assertion's ID (SAML Token Profile 1.1, section 3.4)
   Other,          ///< nothing that the service knows
+};
+
+/// A leg of a negotiation as it was received.
+struct ReceivedLeg {
+  std::string context;
+  /// Counts the legs of the negotiation from 1. 0: no negotiation took it.
+  unsigned ordinal = 0;
+  std::string octets;
 };
 
 /// A request as it was received. Bodies hold passwords: they are for tests to look at, not for
@@ -146,6 +157,8 @@ struct ReceivedRequest {
   /// As far as the request was read: None, too, if its envelope or Security header is broken, or
   /// if a misbehaviour answered it. Whether the signature is right shows in the answer.
   RequestSignature signature = RequestSignature::None;
+  /// Of a leg of a negotiation, as far as the request was read.
+  std::optional<ReceivedLeg> leg;
   int answeredStatus = 0;     ///< 0 when raw octets were sent
   std::string answeredFault;  ///< faultstring of the fault that was answered, else empty
 
@@ -165,9 +178,12 @@ struct Counters {
       0;  ///< what was not an HTTP request; such a connection is closed
   std::uint64_t tokensIssued = 0;
   std::uint64_t faults = 0;
-  std::uint64_t stalls = 0;   ///< stalls that were reached
-  std::uint64_t stalled = 0;  ///< connections that are stalled now
-  std::uint64_t delayed = 0;  ///< requests whose answer is being delayed now
+  std::uint64_t negotiations = 0;      ///< first legs that a negotiation took
+  std::uint64_t negotiationLegs = 0;   ///< all legs that one took
+  std::uint64_t negotiatedTokens = 0;  ///< negotiations that ended in a token
+  std::uint64_t stalls = 0;            ///< stalls that were reached
+  std::uint64_t stalled = 0;           ///< connections that are stalled now
+  std::uint64_t delayed = 0;           ///< requests whose answer is being delayed now
 };
 
 /// The service. It listens from construction to destruction on one HTTP and one HTTPS port, one
@@ -175,7 +191,8 @@ struct Counters {
 /// any thread.
 class Server {
  public:
-  /// Throws `std::runtime_error` if a port cannot be opened or a certificate cannot be made.
+  /// Throws `std::runtime_error` if a port cannot be opened, a certificate cannot be made or the
+  /// keytab holds no key.
   explicit Server(ServerOptions options = {});
   /// Stops accepting, ends every connection and waits for their threads.
   ~Server();
@@ -211,6 +228,10 @@ class Server {
   bool Revoke(const std::string& assertionId);
 
   void SetAssertionOptions(AssertionOptions options);
+
+  void SetNegotiationScript(NegotiationScript script);
+  /// Negotiations that are under way.
+  std::size_t OpenNegotiations() const;
 
   /// Applies to every request (and, for the stalls before a request, every connection) from now on.
   void SetMisbehavior(Misbehavior misbehavior);

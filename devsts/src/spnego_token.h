@@ -1,0 +1,39 @@
+#ifndef DEVSTS_SPNEGO_TOKEN_H
+#define DEVSTS_SPNEGO_TOKEN_H
+
+#include <stdexcept>
+
+#include "octets.h"
+
+// SPNEGO's messages (RFC 4178, section 4.2), as far as a service looks at them that leaves the rest
+// to the GSSAPI library.
+namespace DevSts {
+
+// The octets are not the message that they should be.
+class SpnegoError : public std::runtime_error {
+ public:
+  using std::runtime_error::runtime_error;
+};
+
+enum class NegState : unsigned char {
+  AcceptCompleted = 0,
+  AcceptIncomplete = 1,
+  RequestMic = 3,
+};
+
+// The list of mechanisms in a client's first leg, encoded as it stands there: what a mechListMIC
+// signs. Throws SpnegoError.
+Octets MechTypesIn(const Octets& firstLeg);
+
+// A NegTokenResp that has a state, with this one. Throws SpnegoError.
+Octets WithState(Octets response, NegState state);
+
+// The mechListMIC of a NegTokenResp, empty if there is none. Throws SpnegoError.
+Octets MicIn(const Octets& response);
+
+// A NegTokenResp with a mechListMIC unless that is empty.
+Octets WriteResponse(NegState state, const Octets& mic = {});
+
+}  // namespace DevSts
+
+#endif

@@ -1,0 +1,36 @@
+#ifndef DEVSTS_NEGOTIATION_FIXTURE_H
+#define DEVSTS_NEGOTIATION_FIXTURE_H
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <string>
+
+#include "devsts/kerberos_realm.h"
+#include "devsts/server.h"
+#include "gss_client.h"
+#include "negotiation_client.h"
+
+namespace DevSts::Testing {
+
+// A realm with users who have logged on, and a service that has its key. The environment is changed
+// while no other thread runs.
+class NegotiationFixture : public testing::Test {
+ protected:
+  static constexpr char kService[] = "HTTP/localhost@EXAMPLE.COM";
+
+  static void SetUpTestSuite();
+  static void TearDownTestSuite();
+
+  static ServerOptions Options();
+
+  static std::unique_ptr<KerberosRealm> realm;
+  static std::string keytab;
+  static std::string alice;  // credential caches
+  static std::string bob;
+  static std::string carol;  // not a user of the service
+};
+
+}  // namespace DevSts::Testing
+
+#endif
