@@ -1,8 +1,8 @@
 #include "memory_cache.h"
 
-#include <krb5.h>
-
 #include <tarnik/text/string_util.h>
+
+#include "krb5_handles.h"
 
 namespace SsoClient {
 
@@ -10,15 +10,11 @@ MemoryCache::MemoryCache() : name_("MEMORY:" + Tarnik::StringUtil::GenerateUuid(
 
 // GSSAPI makes the cache when it first has tickets to keep, but has no call that destroys it.
 MemoryCache::~MemoryCache() {
-  krb5_context context = nullptr;
-  if (krb5_init_context(&context) != 0) {
-    return;
-  }
+  const auto context = CreateKrb5Context();
   krb5_ccache cache = nullptr;
-  if (krb5_cc_resolve(context, name_.c_str(), &cache) == 0) {
-    krb5_cc_destroy(context, cache);
+  if (context != nullptr && krb5_cc_resolve(context.get(), name_.c_str(), &cache) == 0) {
+    krb5_cc_destroy(context.get(), cache);
   }
-  krb5_free_context(context);
 }
 
 }  // namespace SsoClient

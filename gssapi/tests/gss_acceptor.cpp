@@ -1,0 +1,54 @@
+#include "gss_acceptor.h"
+
+#include <gssapi/gssapi_ext.h>
+#include <ssoclient/exceptions.h>
+
+#include "gss_error.h"
+
+namespace SsoClient::Testing {
+
+namespace {
+
+std::string TextOf(const GssName& name) {
+  GssBuffer text;
+  GssStatus status;
+  status.major = gss_display_name(&status.minor, name.Get(), text.Address(), nullptr);
+  CheckGssStatus("The client's name cannot be read", status);
+  return {static_cast<const char*>(text.Get().value), text.Get().length};
+}
+
+}  // namespace
+
+// Without a replay cache, which would be a file that all tests share.
+GssAcceptor::GssAcceptor(const std::string& keytab) {
+  gss_key_value_element_desc elements[] = {{"keytab", keytab.c_str()}, {"rcache", "none:"}};
+  const gss_key_value_set_desc store{2, elements};
+  GssStatus status;
+  status.major =
+      gss_acquire_cred_from(&status.minor, GSS_C_NO_NAME, GSS_C_INDEFINITE, GSS_C_NO_OID_SET,
+                            GSS_C_ACCEPT, &store, credentials_.Address(), nullptr, nullptr);
+  CheckGssStatus("The service has no keys", status);
+}
+
+std::vector<unsigned char> GssAcceptor::Accept(const std::vector<unsigned char>& leg) {
+  gss_buffer_desc input{leg.size(), const_cast<unsigned char*>(leg.data())};
+  GssBuffer output;
+  GssName client;
+  GssStatus status;
+  status.major = gss_accept_sec_context(&status.minor, context_.Address(), credentials_.Get(),
+                                        &input, GSS_C_NO_CHANNEL_BINDINGS, client.Address(),
+                                        nullptr, output.Address(), &flags, nullptr, nullptr);
+  try {
+    CheckGssStatus("The service refuses", status);
+  } catch (const SsoException& refusal) {
+    error = refusal.Message();
+  }
+  isEstablished = status.major == GSS_S_COMPLETE;
+  if (isEstablished) {
+    clientName = TextOf(client);
+  }
+  const auto* bytes = static_cast<const unsigned char*>(output.Get().value);
+  return {bytes, bytes + output.Get().length};
+}
+
+}  // namespace SsoClient::Testing

@@ -1,0 +1,34 @@
+#ifndef SSOCLIENT_GSSAPI_TESTS_GSS_ACCEPTOR_H
+#define SSOCLIENT_GSSAPI_TESTS_GSS_ACCEPTOR_H
+
+#include <gssapi/gssapi.h>
+
+#include <string>
+#include <vector>
+
+#include "gss_handle.h"
+
+namespace SsoClient::Testing {
+
+/// The service's side of one negotiation.
+class GssAcceptor {
+ public:
+  /// Throws `SsoException` when the keytab has no keys.
+  explicit GssAcceptor(const std::string& keytab);
+
+  /// The service's leg, which is the refusal when `error` is not empty afterwards.
+  std::vector<unsigned char> Accept(const std::vector<unsigned char>& leg);
+
+  bool isEstablished = false;
+  std::string clientName;
+  OM_uint32 flags = 0;
+  std::string error;
+
+ private:
+  GssCredential credentials_;
+  GssContext context_;
+};
+
+}  // namespace SsoClient::Testing
+
+#endif

@@ -1,0 +1,35 @@
+#ifndef SSOCLIENT_GSSAPI_TESTS_INIT_SEC_CONTEXT_SCRIPT_H
+#define SSOCLIENT_GSSAPI_TESTS_INIT_SEC_CONTEXT_SCRIPT_H
+
+#include <gssapi/gssapi.h>
+
+#include <functional>
+#include <string>
+
+namespace SsoClient::Testing {
+
+/// What a call of gss_init_sec_context gives.
+struct InitResult {
+  OM_uint32 major = GSS_S_COMPLETE;
+  std::string output;
+  OM_uint32 flags = 0;
+};
+
+/// While it lives, gss_init_sec_context does what it says, and not what the library does. One at a
+/// time.
+class InitSecContextScript {
+ public:
+  explicit InitSecContextScript(std::function<InitResult()> script);
+  InitSecContextScript(const InitSecContextScript&) = delete;
+  InitSecContextScript& operator=(const InitSecContextScript&) = delete;
+  ~InitSecContextScript();
+
+  InitResult Run() const { return script_(); }
+
+ private:
+  std::function<InitResult()> script_;
+};
+
+}  // namespace SsoClient::Testing
+
+#endif
