@@ -1,0 +1,186 @@
+// What a caller sees when the service goes wrong in the middle of a negotiation.
+#include <gmock/gmock.h>
+
+#include "negotiation/realm_fixture.h"
+#include "sts/log_capture.h"
+
+namespace SsoClient::Tests {
+namespace {
+
+using ::testing::Contains;
+using ::testing::HasSubstr;
+using ::testing::IsEmpty;
+
+DevSts::NegotiationScript TwoLegs() {
+  DevSts::NegotiationScript script;
+  script.requestMic = true;
+  return script;
+}
+
+class NegotiationFaultsTest : public RealmTest {
+ protected:
+  NegotiationFaultsTest() { Sts().SetNegotiationScript(TwoLegs()); }
+
+  static void LogIn() { Service()->AcquireTokenByGSS(TenMinutes(), *Alice()); }
+  static void MisbehaveOnce(const DevSts::LegMisbehavior& leg) {
+    DevSts::Misbehavior misbehavior;
+    misbehavior.leg = leg;
+    Sts().MisbehaveNext(misbehavior);
+  }
+};
+
+TEST_F(NegotiationFaultsTest, AForgottenNegotiationIsTheServicesFault) {
+  DevSts::LegMisbehavior leg;
+  leg.forget = true;
+  MisbehaveOnce(leg);
+  const std::string message = MessageOf<SsoException>(LogIn);
+  EXPECT_FALSE(Sts().LastRequest().answeredFault.empty());
+  EXPECT_THAT(message, HasSubstr(Sts().LastRequest().answeredFault));
+  EXPECT_EQ(Sts().Requests().size(), 2U);
+}
+
+TEST_F(NegotiationFaultsTest, AnEmptyContextIdEndsTheLoop) {
+  DevSts::LegMisbehavior leg;
+  leg.context = "";
+  MisbehaveOnce(leg);
+  EXPECT_EQ(MessageOf<CommunicationException>(LogIn),
+            "Error processing the response to SPNego token request: no Context ID was returned.");
+  EXPECT_EQ(Sts().Requests().size(), 1U);
+}
+
+TEST_F(NegotiationFaultsTest, AnEmptyContextIdStartsTheContextAnew) {
+  const auto context = Context();
+  const auto handler = Alice();
+  DevSts::LegMisbehavior leg;
+  leg.context = "";
+  MisbehaveOnce(leg);
+  const auto lost = context->Negotiate(*handler->Negotiate({}));
+  EXPECT_EQ(lost.token, nullptr);
+  ASSERT_NE(lost.outputLeg, nullptr);
+  EXPECT_FALSE(lost.outputLeg->empty());
+  // The next call is a first one again, with a login of its own.
+  EXPECT_NE(LogInByContext(*context, *handler), nullptr);
+  EXPECT_EQ(Legs().at(1).ordinal, 1U);
+}
+
+TEST_F(NegotiationFaultsTest, AnEmptyLegOfTheServiceRestartsTheHandler) {
+  DevSts::LegMisbehavior leg;
+  leg.leg = "";
+  MisbehaveOnce(leg);
+  // An empty leg is how a negotiation begins: the handler's first leg comes twice, the service
+  // wants its second one.
+  EXPECT_THROW(LogIn(), SsoException);
+  const auto legs = Legs();
+  ASSERT_EQ(legs.size(), 2U);
+  EXPECT_FALSE(legs[1].octets.empty());
+  EXPECT_EQ(Sts().OpenNegotiations(), 0U);
+}
+
+TEST_F(NegotiationFaultsTest, ALateFailureIsTheServicesFault) {
+  auto script = TwoLegs();
+  script.failAtLeg = 2;
+  Sts().SetNegotiationScript(script);
+  EXPECT_THAT(MessageOf<InvalidCredentialsException>(LogIn),
+              HasSubstr("The negotiation was told to fail"));
+  const auto context = Context();
+  const auto handler = Alice();
+  EXPECT_THAT(MessageOf<InvalidCredentialsException>([&] { LogInByContext(*context, *handler); }),
+              HasSubstr("The negotiation was told to fail"));
+}
+
+TEST_F(NegotiationFaultsTest, AServiceThatDemandsACookieThatItNeverSetRefuses) {
+  DevSts::LegMisbehavior leg;
+  leg.omitCookie = true;
+  MisbehaveOnce(leg);
+  EXPECT_THROW(LogIn(), SsoException);
+  EXPECT_EQ(Sts().LastRequest().HeaderCount("Cookie"), 0U);
+}
+
+TEST_F(NegotiationFaultsTest, ACutConnectionIsACommunicationFailure) {
+  for (const std::size_t leg : {1U, 2U}) {
+    Sts().ClearMisbehavior();
+    DevSts::Misbehavior cut;
+    cut.cutOff = DevSts::CutOff{10};
+    Sts().MisbehaveNext({}, leg - 1);
+    Sts().MisbehaveNext(cut);
+    EXPECT_THROW(LogIn(), CommunicationException) << leg;
+  }
+}
+
+TEST_F(NegotiationFaultsTest, APrincipalWithoutAnAccountIsRefused) {
+  auto nobody = AsAlice();
+  nobody.credentialCache = Realm().Login("nobody", "nobody-secret");
+  const auto handler = CreateGssapiNegotiationHandler(nobody);
+  MessageOf<InvalidCredentialsException>(
+      [&] { Service()->AcquireTokenByGSS(TenMinutes(), *handler); });
+}
+
+TEST_F(NegotiationFaultsTest, FailureStillEndsItsLog) {
+  const Testing::LogCapture log(7);
+  auto script = TwoLegs();
+  script.failAtLeg = 1;
+  Sts().SetNegotiationScript(script);
+  EXPECT_THROW(LogIn(), InvalidCredentialsException);
+  ASSERT_EQ(log.Lines().size(), 3U);
+  EXPECT_EQ(log.Lines().front(), "7 START operation SecurityTokenServiceImpl::AcquireTokenByGSS");
+  EXPECT_EQ(log.Lines().back(), "7 END operation SecurityTokenServiceImpl::AcquireTokenByGSS");
+}
+
+/// A class that the library does not know.
+struct HandlersOwn {
+  int value;
+};
+
+class OddHandler final : public NegotiationHandler {
+ public:
+  explicit OddHandler(int callToFail) : callToFail_(callToFail) {}
+
+  std::shared_ptr<const std::vector<unsigned char>> Negotiate(
+      const std::vector<unsigned char>& serverLeg) override {
+    if (++calls_ == callToFail_) {
+      throw HandlersOwn{calls_};
+    }
+    return legs_->Negotiate(serverLeg);
+  }
+
+  std::shared_ptr<NegotiationHandler> legs_;
+
+ private:
+  int callToFail_;
+  int calls_ = 0;
+};
+
+TEST_F(NegotiationFaultsTest, WhatTheHandlerThrowsReachesTheCallerUnchanged) {
+  for (const int call : {1, 2, 3}) {
+    Sts().ClearRequests();
+    OddHandler handler(call);
+    handler.legs_ = Alice();
+    try {
+      Service()->AcquireTokenByGSS(TenMinutes(), handler);
+      ADD_FAILURE() << "nothing was thrown";
+    } catch (const HandlersOwn& thrown) {
+      EXPECT_EQ(thrown.value, call);
+    }
+    // The third call comes after the last leg of the service.
+    EXPECT_EQ(Sts().Requests().size(), static_cast<std::size_t>(call - 1));
+  }
+}
+
+class SilentHandler final : public NegotiationHandler {
+ public:
+  std::shared_ptr<const std::vector<unsigned char>> Negotiate(
+      const std::vector<unsigned char>&) override {
+    return nullptr;
+  }
+};
+
+TEST_F(NegotiationFaultsTest, AHandlerWithoutALegIsRefusedBeforeAnythingIsSent) {
+  SilentHandler handler;
+  EXPECT_EQ(MessageOf<Tarnik::InvalidArgumentException>(
+                [&] { Service()->AcquireTokenByGSS(TenMinutes(), handler); }),
+            "Invalid NegotiationHandler: the returned leg may not be NULL");
+  EXPECT_THAT(Sts().Requests(), IsEmpty());
+}
+
+}  // namespace
+}  // namespace SsoClient::Tests

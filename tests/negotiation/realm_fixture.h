@@ -1,0 +1,53 @@
+#ifndef TESTS_NEGOTIATION_REALM_FIXTURE_H
+#define TESTS_NEGOTIATION_REALM_FIXTURE_H
+
+#include <devsts/kerberos_realm.h>
+#include <devsts/server.h>
+#include <gtest/gtest.h>
+#include <ssoclient/gssapi_negotiation_handler.h>
+#include <ssoclient/ssoclient.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "integration/holder_of_key_fixture.h"
+#include "integration/sts_fixture.h"
+
+namespace SsoClient::Tests {
+
+/// The dev STS's name in the realm.
+inline constexpr char kTarget[] = "HTTP@sts.example";
+
+/// One Kerberos realm for all tests of the process, which is a part of it, and one dev STS with a
+/// key of that realm, well-behaved at the start of each test. alice has a password there, machine a
+/// keytab, nobody an account at the STS.
+class RealmTest : public ::testing::Test {
+ protected:
+  RealmTest();
+
+  static DevSts::KerberosRealm& Realm();
+  static DevSts::Server& Sts();
+
+  /// Logs in to `Sts()`.
+  static std::shared_ptr<SecurityTokenService> Service();
+  static std::shared_ptr<SecurityTokenService> HolderService();
+  static std::shared_ptr<InternalApi::GssNegotiationContext> Context();
+  /// Makes alice's legs.
+  static GssapiNegotiationConfig AsAlice();
+  static GssapiNegotiationConfig AsMachine();
+  static std::shared_ptr<GssapiNegotiationHandler> Alice() {
+    return CreateGssapiNegotiationHandler(AsAlice());
+  }
+
+  /// Calls `Context()` until it has a token.
+  static std::shared_ptr<const SamlToken> LogInByContext(
+      InternalApi::GssNegotiationContext& context, NegotiationHandler& handler);
+
+  /// The legs that the STS received since the test began.
+  static std::vector<DevSts::ReceivedLeg> Legs();
+};
+
+}  // namespace SsoClient::Tests
+
+#endif
