@@ -193,10 +193,12 @@ TEST(ReadSubject, RefusesMissingParts) {
   EXPECT_EQ(
       Refusal(Replaced(BearerText(), R"( Method="urn:oasis:names:tc:SAML:2.0:cm:bearer")", "")),
       "Node 'saml2:SubjectConfirmation is missing required attribute 'Method'");
-  EXPECT_EQ(Refusal(Replaced(BearerText(), " NotOnOrAfter=\"2024-03-05T08:00:00.000Z\"", "")),
-            "Node 'saml2:SubjectConfirmationData is missing required attribute 'NotOnOrAfter'");
-  EXPECT_EQ(Refusal(Replaced(BearerText(), "2024-03-05T08:00:00.000Z", "later")),
-            "saml2:SubjectConfirmationData/@NotOnOrAfter is not a date");
+  for (const std::string& text : {BearerText(), HolderOfKeyText()}) {
+    EXPECT_EQ(Refusal(Replaced(text, " NotOnOrAfter=\"2024-03-05T08:00:00.000Z\"", "")),
+              "Node 'saml2:SubjectConfirmationData is missing required attribute 'NotOnOrAfter'");
+    EXPECT_EQ(Refusal(Replaced(text, "2024-03-05T08:00:00.000Z", "later")),
+              "saml2:SubjectConfirmationData/@NotOnOrAfter is not a date");
+  }
   EXPECT_EQ(Refusal(Replaced(BearerText(),
                              "<saml2:SubjectConfirmationData "
                              "NotOnOrAfter=\"2024-03-05T08:00:00.000Z\"/>",
