@@ -12,6 +12,8 @@ namespace {
 TEST(PrincipalId, EqualsWithoutRegardToLetterCase) {
   EXPECT_TRUE((PrincipalId{"Alice", "Example.COM"} == PrincipalId{"alice", "example.com"}));
   EXPECT_TRUE((PrincipalId{"", ""} == PrincipalId{"", ""}));
+  EXPECT_TRUE((PrincipalId{"ABCDEFGHIJKLMNOPQRSTUVWXYZ", "abcdefghijklmnopqrstuvwxyz"} ==
+               PrincipalId{"abcdefghijklmnopqrstuvwxyz", "ABCDEFGHIJKLMNOPQRSTUVWXYZ"}));
 }
 
 TEST(PrincipalId, DiffersByNameOrDomain) {

@@ -1,6 +1,8 @@
 #include "token/saml_token_impl.h"
 
+#include <cstdlib>
 #include <cstring>
+#include <ctime>
 #include <limits>
 
 #include <tarnik/crypto/certificate.h>
@@ -164,6 +166,19 @@ TEST(SamlTokenImpl, AddsItsToleranceToTheExpirationTime) {
   EXPECT_EQ(MakeToken(text)->ExpirationTimeWithTolerance().ToString(), "2024-03-05T08:11:00.000Z");
   EXPECT_EQ(MakeToken(text, -60)->ExpirationTimeWithTolerance().ToString(),
             "2024-03-05T08:00:00.000Z");
+}
+
+TEST(SamlTokenImpl, TellsItsTimesInUtcInEveryZone) {
+  const char* before = std::getenv("TZ");
+  const std::string saved = before == nullptr ? "" : before;
+  setenv("TZ", "XYZ-5:30", 1);
+  tzset();
+  const auto token = MakeToken(AssertionText(kNow));
+  EXPECT_EQ(token->StartTime().ToString(), "2024-03-05T07:00:00.000Z");
+  EXPECT_EQ(token->ExpirationTime().ToString(), "2024-03-05T08:01:00.000Z");
+  EXPECT_EQ(token->ExpirationTimeWithTolerance().ToString(), "2024-03-05T08:11:00.000Z");
+  before == nullptr ? unsetenv("TZ") : setenv("TZ", saved.c_str(), 1);
+  tzset();
 }
 
 TEST(SamlTokenImpl, StopsAtTheEndsOfTimeWithExtremeTolerances) {
