@@ -171,6 +171,9 @@ TEST(ReadSubject, JudgesTheMethodBeforeWhatItConfirms) {
   const std::string text = Replaced(BearerText(), "cm:bearer", "cm:other");
   EXPECT_EQ(Refusal(Replaced(text, "<saml2:SubjectConfirmationData ", "<x ")),
             "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:other'");
+  EXPECT_EQ(Refusal(Replaced(text, "<saml2:SubjectConfirmationData ",
+                             "<saml2:NameID/><saml2:SubjectConfirmationData ")),
+            "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:other'");
   EXPECT_EQ(Refusal(Replaced(text, "alice@example.com", "alice")),
             "Failed to parse the UPN NameID: `alice'; name or domain part is missing.");
 }
