@@ -1,5 +1,7 @@
 #include <ssoclient/exceptions.h>
 
+#include <cxxabi.h>
+
 #include <cstddef>
 #include <new>
 #include <typeinfo>
@@ -87,6 +89,37 @@ bool IsCaughtAs() {
   } catch (...) {
     return false;
   }
+}
+
+// The one class that a class derives from directly (Itanium C++ ABI, section 2.9.5).
+const std::type_info& BaseOf(const std::type_info& derived) {
+  return *dynamic_cast<const abi::__si_class_type_info&>(derived).__base_type;
+}
+
+TEST(Exceptions, DeriveFromTheirBases) {
+  const std::pair<const std::type_info&, const std::type_info&> cases[] = {
+      {typeid(Tarnik::Exception), typeid(Tarnik::Throwable)},
+      {typeid(SsoException), typeid(Tarnik::Exception)},
+      {typeid(CommunicationException), typeid(SsoException)},
+      {typeid(InvalidCredentialsException), typeid(SsoException)},
+      {typeid(PasswordExpiredException), typeid(SsoException)},
+      {typeid(InvalidTokenException), typeid(SsoException)},
+      {typeid(ParseException), typeid(InvalidTokenException)},
+      {typeid(InvalidSignatureException), typeid(InvalidTokenException)}};
+  for (const auto& [derived, base] : cases) {
+    EXPECT_EQ(BaseOf(derived), base) << derived.name();
+  }
+}
+
+TYPED_TEST(ExceptionClass, AddsNoDataOfItsOwn) {
+  EXPECT_EQ(sizeof(TypeParam), sizeof(Tarnik::Exception));
+}
+
+TYPED_TEST(ExceptionClass, CopiesItsMessageAndPlace) {
+  const TypeParam original("message");
+  const TypeParam copy(original);  // NOLINT(performance-unnecessary-copy-initialization)
+  EXPECT_EQ(copy.Message(), "message");
+  EXPECT_EQ(copy.Where().line(), original.Where().line());
 }
 
 TEST(Exceptions, CatchBothTokenFailuresAsInvalidToken) {

@@ -121,6 +121,14 @@ TEST(Describe, WritesSpecWithAllParts) {
             "urn:b, advice=[Advice [source=S, attributes=[]], Advice [source=T, attributes=[]]]");
 }
 
+TEST(Describe, WritesTheConfirmationTypeAsItsNumber) {
+  TokenSpec spec;
+  spec.confirmation = static_cast<ConfirmationType>(-12);
+  EXPECT_EQ(Describe(spec),
+            "TokenSpec [tokenLifetimeSec=0, delegable=false, delegateTo=<unset>, renewable=false, "
+            "confirmationType=-12,audienceRestriction=, advice=[]");
+}
+
 TEST(Describe, TellsAnEmptyDelegateFromNone) {
   TokenSpec spec;
   spec.delegateTo = std::string();

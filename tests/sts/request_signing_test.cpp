@@ -120,6 +120,7 @@ constexpr char kNotDefault[] =
     "TokenSpec::confirmation must be CONFIRMATION_DEFAULT for acquire token by certificate";
 constexpr auto kDefault = CONFIRMATION_DEFAULT;
 constexpr auto kOther = CONFIRMATION_BEARER;
+constexpr auto kUnnamed = static_cast<ConfirmationType>(-1);  // anything but zero means bearer
 
 const std::vector<std::string> kPlainPassword{kTimestamp, kUsername};
 const std::vector<std::string> kSignedPassword{kTimestamp, kUsername, kCertificate, kSignature};
@@ -181,6 +182,8 @@ INSTANTIATE_TEST_SUITE_P(
                     true},
         SigningCase{"PasswordBearer", ByPassword, true, kOther, false, kPlainPassword, kBearer,
                     false},
+        SigningCase{"PasswordOfAnotherConfirmation", ByPassword, true, kUnnamed, false,
+                    kPlainPassword, kBearer, false},
         SigningCase{"PasswordActAs", ByPassword, true, kDefault, true, kPlainPassword, kPublicKey,
                     true},
         SigningCase{"PasswordBearerActAs", ByPassword, true, kOther, true, kPlainPassword, kBearer,

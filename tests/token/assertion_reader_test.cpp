@@ -34,6 +34,7 @@ void ExpectAllValues(const ParsedAssertion& parsed) {
   ASSERT_NE(parsed.signature, nullptr);
   EXPECT_EQ(parsed.signature->References().front().uri, "#_a1");
   EXPECT_EQ(parsed.subject.principal.name, "alice");
+  EXPECT_EQ(parsed.conditions.notBefore.ToString(), "2024-03-05T07:00:00.000Z");
   EXPECT_EQ(parsed.conditions.notOnOrAfter.ToString(), "2024-03-05T08:01:00.000Z");
   ASSERT_EQ(parsed.advice.size(), 1U);
   EXPECT_EQ(parsed.advice.front().source, "urn:source");
@@ -43,6 +44,7 @@ void ExpectAllValues(const ParsedAssertion& parsed) {
             "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport");
   ASSERT_EQ(parsed.attributes.groups.size(), 2U);
   EXPECT_EQ(parsed.attributes.groups.front().name, "staff");
+  EXPECT_EQ(parsed.attributes.names.givenName, "Alice");
   EXPECT_EQ(parsed.attributes.names.surname, "Archer");
 }
 
@@ -213,6 +215,44 @@ TEST(ReadAssertion, NamesTheFirstFaultInReadingOrder) {
   EXPECT_EQ(Refusal(text.ToXml()), "Token's signature must cover the entire token");
   text.attributes = "Version=\"2.0\"";
   EXPECT_EQ(Refusal(text.ToXml()), "Node 'saml2:Assertion is missing required attribute 'ID'");
+  text.attributes = "x=\"\"";
+  EXPECT_EQ(Refusal(text.ToXml()), "Node 'saml2:Assertion is missing required attribute 'Version'");
+}
+
+struct Fault {
+  std::string AssertionText::*part;
+  const char* broken;
+  const char* message;
+};
+
+// Every part is broken: each message shows once the parts before are repaired.
+TEST(ReadAssertion, ReadsItsPartsInTheirOrder) {
+  const Fault faults[] = {
+      {&AssertionText::attributes, R"(ID="_a1" Version="2.0" IssueInstant="soon")",
+       "saml2:Assertion/@IssueInstant is not a date"},
+      {&AssertionText::issuer, "<saml2:Issuer x=\"\">i</saml2:Issuer>",
+       "Unexpected attributes on element 'saml2:Issuer'"},
+      {&AssertionText::signature, "text", "Expected element ds:Signature not found"},
+      {&AssertionText::subject, "<saml2:Subject/>", "Expected element 'NameID' not found."},
+      {&AssertionText::conditions, "<saml2:Conditions/>",
+       "Node 'saml2:Conditions is missing required attribute 'NotBefore'"},
+      {&AssertionText::advice, "<saml2:Advice x=\"\"/>",
+       "Unexpected attributes on element 'saml2:Advice'"},
+      {&AssertionText::authnStatement, "<saml2:AuthnStatement/>",
+       "Node 'saml2:AuthnStatement is missing required attribute 'AuthnInstant'"},
+      {&AssertionText::attributeStatement, "<saml2:AttributeStatement x=\"\"/>",
+       "Unexpected attributes on element 'saml2:AttributeStatement'"},
+      {&AssertionText::tail, "<x/>", "Unexpected elements under Assertion"}};
+  const AssertionText good(kNow);
+  AssertionText text(kNow);
+  for (const Fault& fault : faults) {
+    text.*fault.part = fault.broken;
+  }
+  for (const Fault& fault : faults) {
+    EXPECT_EQ(Refusal(text.ToXml()), fault.message);
+    text.*fault.part = good.*fault.part;
+  }
+  ExpectAllValues(Read(text.ToXml()));
 }
 
 }  // namespace

@@ -38,5 +38,28 @@ TEST(ChildCursor, GoesIntoAnElementWithTheSameFilter) {
   EXPECT_TRUE(inner.IsAtElement("b"));
 }
 
+// Shows elements only, and counts what it is asked.
+class ElementsOnly final : public NodeFilter {
+ public:
+  bool IsVisible(const Tarnik::Xml::Node& node) const override {
+    ++asked;
+    return node.Kind() == Tarnik::Xml::NodeKind::kElement;
+  }
+
+  mutable int asked = 0;
+};
+
+TEST(ChildCursor, SharesOneFilterOfAnyKind) {
+  Fragment fragment("text<a>text<b/></a>");
+  const auto filter = std::make_shared<const ElementsOnly>();
+  const ChildCursor outer(fragment.Root(), filter);
+  EXPECT_TRUE(outer.IsAtElement("a"));
+  EXPECT_EQ(filter->asked, 2);
+  const ChildCursor inner = outer.Into(fragment.Element());
+  EXPECT_TRUE(inner.IsAtElement("b"));
+  EXPECT_EQ(filter->asked, 4);
+  EXPECT_EQ(filter.use_count(), 3);
+}
+
 }  // namespace
 }  // namespace SsoClient

@@ -74,6 +74,9 @@ TEST(ReadConditions, ReadsEveryRestrictionInAnyOrder) {
     ASSERT_TRUE(conditions.delegationChain.has_value());
     ASSERT_EQ(conditions.delegationChain->size(), 2U);
     EXPECT_EQ(conditions.delegationChain->front().delegate.name, "one");
+    EXPECT_EQ(conditions.delegationChain->front().delegate.domain, "d");
+    EXPECT_EQ(conditions.delegationChain->front().delegationInstant.ToString(),
+              "2024-03-05T07:08:09.000Z");
     EXPECT_EQ(conditions.delegationChain->back().delegate.name, "two");
     EXPECT_EQ(conditions.delegationChain->back().delegationInstant.ToString(),
               "2024-03-05T07:08:10.000Z");
@@ -128,6 +131,8 @@ TEST(ReadConditions, RefusesMissingOrBrokenTimes) {
        "Node 'saml2:Conditions is missing required attribute 'NotBefore'"},
       {R"( NotOnOrAfter="2024-03-05T08:00:00Z")", "",
        "Node 'saml2:Conditions is missing required attribute 'NotOnOrAfter'"},
+      {R"( NotBefore="2024-03-05T07:00:00Z" NotOnOrAfter="2024-03-05T08:00:00Z")", "",
+       "Node 'saml2:Conditions is missing required attribute 'NotBefore'"},
       {"2024-03-05T07:00:00Z", "now", "saml2:Conditions/@NotBefore is not a date"},
       {"2024-03-05T08:00:00Z", "", "saml2:Conditions/@NotOnOrAfter is not a date"},
       {"<saml2:Conditions ", "<saml2:Conditions Id=\"i\" ",
@@ -202,6 +207,9 @@ TEST(ReadConditions, RefusesBrokenDelegationRestriction) {
   EXPECT_EQ(refusal("<del:Delegate x=\"\"" + instant + ">" + nameId + "</del:Delegate>"),
             "Unexpected attributes on element 'del:Delegate'");
   EXPECT_EQ(refusal("<del:Delegate" + instant + "/>"), "Expected element 'NameID' not found.");
+  EXPECT_EQ(
+      refusal("<del:Delegate" + instant + ">" + Replaced(nameId, "a@b", "ab") + "</del:Delegate>"),
+      "Failed to parse the UPN NameID: `ab'; name or domain part is missing.");
   EXPECT_EQ(refusal("<del:Delegate" + instant + ">" + nameId + nameId + "</del:Delegate>"),
             "Element 'del:Delegate' must be empty");
   EXPECT_EQ(refusal("<saml2:Delegate" + instant + ">" + nameId + "</saml2:Delegate>"),

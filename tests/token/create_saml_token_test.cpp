@@ -142,6 +142,20 @@ TEST(CreateSamlToken, RefusesAStrangersSignature) {
   EXPECT_EQ(message.rfind("Signature verification error. ", 0), 0U) << message;
 }
 
+TEST(CreateSamlToken, ReadsTheWholeTokenBeforeItJudgesValidity) {
+  AssertionText text;
+  text.attributes = Replaced(text.attributes, "2.0", "1.1");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(text.ToXml()); }),
+            "Invalid token version");
+  AssertionText uncovered = text;
+  uncovered.signature = TestSupport::MadeUpSignature("#other");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(uncovered.ToXml()); }),
+            "Token's signature must cover the entire token");
+  text.tail = "<x/>";
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(text.ToXml()); }),
+            "Unexpected elements under Assertion");
+}
+
 TEST(CreateSamlToken, JudgesValidityBeforeTheSignature) {
   const auto now = Tarnik::System::GetUtcDateTime();
   const auto longAgo = Tarnik::System::DateTimeFromUtc(now.GetUtcTime() - 7200L * 1'000'000, false);

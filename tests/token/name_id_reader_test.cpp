@@ -31,6 +31,7 @@ TEST(ReadNameId, RefusesByTheReadingRules) {
       {"<ds:Issuer>i</ds:Issuer>", "Element 'ds:Issuer' has unexpected namespace"},
       {R"(<saml2:Issuer NameQualifier="q">i</saml2:Issuer>)",
        "Unexpected attributes on element 'saml2:Issuer'"},
+      {R"(<saml2:Issuer NameQualifier="q"/>)", "Unexpected attributes on element 'saml2:Issuer'"},
       {"<saml2:Issuer/>",
        "Element 'saml2:Issuer' must only have textual content (but has extra children or is "
        "empty)."},
@@ -59,6 +60,10 @@ TEST(ReadPrincipal, RefusesOtherAndMissingFormat) {
   Fragment missing("<saml2:NameID>a@b</saml2:NameID>");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadPrincipal(missing.Cursor()); }),
             "Invalid or unsupported NameId format '");
+  Fragment empty(R"(<saml2:NameID Format="urn:f"/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadPrincipal(empty.Cursor()); }),
+            "Element 'saml2:NameID' must only have textual content (but has extra children or is "
+            "empty).");
 }
 
 // A reader that stops at a comment would see another user than the one that was signed.

@@ -3,6 +3,7 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
+#include <cstddef>
 #include <new>
 
 namespace SsoClient {
@@ -11,6 +12,8 @@ namespace {
 TEST(PrincipalId, EqualsWithoutRegardToLetterCase) {
   EXPECT_TRUE((PrincipalId{"Alice", "Example.COM"} == PrincipalId{"alice", "example.com"}));
   EXPECT_TRUE((PrincipalId{"", ""} == PrincipalId{"", ""}));
+  EXPECT_TRUE((PrincipalId{"ABCDEFGHIJKLMNOPQRSTUVWXYZ", "abcdefghijklmnopqrstuvwxyz"} ==
+               PrincipalId{"abcdefghijklmnopqrstuvwxyz", "ABCDEFGHIJKLMNOPQRSTUVWXYZ"}));
 }
 
 TEST(PrincipalId, DiffersByNameOrDomain) {
@@ -39,6 +42,21 @@ TEST(PrincipalId, EqualsItselfWithoutALookAtItsStrings) {
   ASSERT_EQ(mprotect(page, pageSize, PROT_READ | PROT_WRITE), 0);
   principal->~PrincipalId();
   munmap(page, pageSize);
+}
+
+// The domain stands on a page that no one may read while the object is compared.
+TEST(PrincipalId, LooksAtTheDomainsOnlyWhenTheNamesMatch) {
+  const auto pageSize = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
+  void* pages =
+      mmap(nullptr, 2 * pageSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  ASSERT_NE(pages, MAP_FAILED);
+  char* second = static_cast<char*>(pages) + pageSize;
+  auto* principal = new (second - offsetof(PrincipalId, domain)) PrincipalId{"alice", "a"};
+  ASSERT_EQ(mprotect(second, pageSize, PROT_NONE), 0);
+  EXPECT_FALSE((*principal == PrincipalId{"bob", "a"}));
+  ASSERT_EQ(mprotect(second, pageSize, PROT_READ | PROT_WRITE), 0);
+  principal->~PrincipalId();
+  munmap(pages, 2 * pageSize);
 }
 
 TEST(PrincipalId, StopsAtTheFirstNul) {

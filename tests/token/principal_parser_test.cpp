@@ -37,6 +37,11 @@ TEST(PrincipalFromNameId, RejectsOtherFormat) {
             "Invalid or unsupported NameId format 'http://schemas.xmlsoap.org/claims/upn");
 }
 
+TEST(PrincipalFromNameId, JudgesTheFormatBeforeTheValue) {
+  EXPECT_EQ(ThrownMessage<ParseException>([] { PrincipalFromNameId("urn:other", "alice"); }),
+            "Invalid or unsupported NameId format 'urn:other");
+}
+
 TEST(PrincipalFromGroupIdentity, SplitsAtTheFirstBackslash) {
   const PrincipalId plain = PrincipalFromGroupIdentity("EXAMPLE\\staff");
   EXPECT_EQ(plain.name, "staff");

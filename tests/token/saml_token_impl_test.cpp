@@ -1,5 +1,8 @@
 #include "token/saml_token_impl.h"
 
+#include <cstdlib>
+#include <cstring>
+#include <ctime>
 #include <limits>
 
 #include <tarnik/crypto/certificate.h>
@@ -46,7 +49,13 @@ TEST(SamlTokenImpl, TellsEveryValue) {
   EXPECT_TRUE(token->IsDelegable());
   EXPECT_FALSE(token->IsSolution());
   EXPECT_EQ(token->ConfirmationType(), HOLDER_OF_KEY);
-  ASSERT_NE(token->HolderOfKeyCertificate(), nullptr);
+  const auto certificate = token->HolderOfKeyCertificate();
+  ASSERT_NE(certificate, nullptr);
+  const auto expected =
+      Tarnik::Crypto::CreateCertificatesFromPem(TestSupport::TrustedCredential().certificatePem)
+          .front();
+  ASSERT_EQ(certificate->DerLength(), expected->DerLength());
+  EXPECT_EQ(std::memcmp(certificate->DerBytes(), expected->DerBytes(), expected->DerLength()), 0);
   ASSERT_NE(token->GetSignature(), nullptr);
   EXPECT_EQ(token->GetSignature()->References().front().uri, "#_a1");
 }
@@ -61,13 +70,18 @@ TEST(SamlTokenImpl, ReplacesWhatItsArgumentsHeld) {
   token->GetGroups(groups);
   ASSERT_EQ(groups.size(), 2U);
   EXPECT_EQ(groups[0].name, "staff");
+  EXPECT_EQ(groups[0].domain, "EXAMPLE");
   EXPECT_EQ(groups[1].name, "admins");
+  EXPECT_EQ(groups[1].domain, "EXAMPLE");
   std::vector<Delegate> chain(5);
   token->GetDelegationChain(chain);
   ASSERT_EQ(chain.size(), 2U);
   EXPECT_EQ(chain[0].delegate.name, "first");
+  EXPECT_EQ(chain[0].delegate.domain, "example.com");
   EXPECT_EQ(chain[0].delegationInstant.ToString(), "2024-03-05T07:08:09.010Z");
   EXPECT_EQ(chain[1].delegate.name, "second");
+  EXPECT_EQ(chain[1].delegate.domain, "example.com");
+  EXPECT_EQ(chain[1].delegationInstant.ToString(), "2024-03-05T07:08:10.000Z");
   std::set<std::string> audiences{"old"};
   token->GetAudiences(audiences);
   EXPECT_EQ(audiences, (std::set<std::string>{"https://a.example", "https://b.example"}));
@@ -76,6 +90,7 @@ TEST(SamlTokenImpl, ReplacesWhatItsArgumentsHeld) {
   ASSERT_EQ(advice.size(), 1U);
   EXPECT_EQ(advice[0].source, "urn:source");
   ASSERT_EQ(advice[0].attributes.size(), 1U);
+  EXPECT_EQ(advice[0].attributes[0].name, "urn:hint");
   EXPECT_EQ(advice[0].attributes[0].values, (std::vector<std::string>{"one", "two"}));
 }
 
@@ -153,6 +168,19 @@ TEST(SamlTokenImpl, AddsItsToleranceToTheExpirationTime) {
             "2024-03-05T08:00:00.000Z");
 }
 
+TEST(SamlTokenImpl, TellsItsTimesInUtcInEveryZone) {
+  const char* before = std::getenv("TZ");
+  const std::string saved = before == nullptr ? "" : before;
+  setenv("TZ", "XYZ-5:30", 1);
+  tzset();
+  const auto token = MakeToken(AssertionText(kNow));
+  EXPECT_EQ(token->StartTime().ToString(), "2024-03-05T07:00:00.000Z");
+  EXPECT_EQ(token->ExpirationTime().ToString(), "2024-03-05T08:01:00.000Z");
+  EXPECT_EQ(token->ExpirationTimeWithTolerance().ToString(), "2024-03-05T08:11:00.000Z");
+  before == nullptr ? unsetenv("TZ") : setenv("TZ", saved.c_str(), 1);
+  tzset();
+}
+
 TEST(SamlTokenImpl, StopsAtTheEndsOfTimeWithExtremeTolerances) {
   const AssertionText text(kNow);
   EXPECT_EQ(
@@ -219,6 +247,7 @@ TEST(SamlToken, KeepsTheSlotOrderOfItsCollections) {
   SubjectNames names;
   CallSlot<void, SubjectNames&>(token, 9, names);
   EXPECT_EQ(names.givenName, "Alice");
+  EXPECT_EQ(names.surname, "Archer");
   std::vector<PrincipalId> groups;
   CallSlot<void, std::vector<PrincipalId>&>(token, 10, groups);
   EXPECT_EQ(groups.size(), 2U);

@@ -49,6 +49,11 @@ TEST(ReadSubject, ReadsABearerSubject) {
   EXPECT_EQ(subject.holderOfKeyCertificate, nullptr);
 }
 
+std::string DerOf(const Tarnik::Crypto::Certificate& certificate) {
+  return std::string(reinterpret_cast<const char*>(certificate.DerBytes()),
+                     certificate.DerLength());
+}
+
 TEST(ReadSubject, ReadsAHolderOfKeySubject) {
   const ParsedSubject subject = Read(HolderOfKeyText());
   EXPECT_EQ(subject.confirmationMethod, HOLDER_OF_KEY);
@@ -56,7 +61,8 @@ TEST(ReadSubject, ReadsAHolderOfKeySubject) {
   ASSERT_NE(subject.holderOfKeyCertificate, nullptr);
   const auto expected =
       Tarnik::Crypto::CreateCertificatesFromPem(TrustedCredential().certificatePem).front();
-  EXPECT_EQ(subject.holderOfKeyCertificate->SerialNumber(), expected->SerialNumber());
+  EXPECT_EQ(DerOf(*subject.holderOfKeyCertificate), DerOf(*expected));
+  EXPECT_FALSE(subject.delegateId.has_value());
 }
 
 TEST(ReadSubject, ReadsTheDelegateId) {
@@ -64,6 +70,16 @@ TEST(ReadSubject, ReadsTheDelegateId) {
   ASSERT_TRUE(subject.delegateId.has_value());
   EXPECT_EQ(subject.delegateId->name, "second");
   EXPECT_EQ(subject.delegateId->domain, "example.com");
+  EXPECT_EQ(subject.principal.name, "alice");
+}
+
+TEST(ReadSubject, ReadsTheDelegateIdAsAPrincipal) {
+  const std::string text = AssertionText(kNow).Delegate().subject;
+  EXPECT_EQ(Refusal(Replaced(text, "second@example.com", "second")),
+            "Failed to parse the UPN NameID: `second'; name or domain part is missing.");
+  EXPECT_EQ(Refusal(Replaced(text, R"(cm:bearer"><saml2:NameID Format="http://)",
+                             R"(cm:bearer"><saml2:NameID Format="https://)")),
+            "Invalid or unsupported NameId format 'https://schemas.xmlsoap.org/claims/UPN");
 }
 
 TEST(ReadSubject, SkipsWhiteSpaceAndComments) {
@@ -132,13 +148,34 @@ TEST(ReadSubject, RefusesWhatStandsBehindAnExpectedChild) {
   }
 }
 
+// Something stands behind every child: each message shows once the children inside are repaired.
 TEST(ReadSubject, NamesTheInnermostFaultFirst) {
+  const std::pair<const char*, const char*> cases[] = {
+      {"</ds:X509Certificate>", "Unexpected elements after X509Certificate"},
+      {"</ds:X509Data>", "Unexpected elements after X509Data"},
+      {"</ds:KeyInfo>", "Unexpected elements after SubjectConfirmationData/KeyInfo"},
+      {"</saml2:SubjectConfirmationData>", "Unexpected elements after SubjectConfirmationData"},
+      {"</saml2:SubjectConfirmation>", "Unexpected elements after SubjectConfirmation"}};
   std::string text = HolderOfKeyText();
-  for (const char* anchor : {"</ds:X509Certificate>", "</ds:X509Data>", "</ds:KeyInfo>",
-                             "</saml2:SubjectConfirmationData>", "</saml2:SubjectConfirmation>"}) {
+  for (const auto& [anchor, message] : cases) {
     text = InsertedBehind(text, anchor, "<x/>");
   }
-  EXPECT_EQ(Refusal(text), "Unexpected elements after X509Certificate");
+  for (const auto& [anchor, message] : cases) {
+    EXPECT_EQ(Refusal(text), message);
+    text = Replaced(text, std::string(anchor) + "<x/>", anchor);
+  }
+  EXPECT_EQ(Read(text).principal.name, "alice");
+}
+
+TEST(ReadSubject, JudgesTheMethodBeforeWhatItConfirms) {
+  const std::string text = Replaced(BearerText(), "cm:bearer", "cm:other");
+  EXPECT_EQ(Refusal(Replaced(text, "<saml2:SubjectConfirmationData ", "<x ")),
+            "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:other'");
+  EXPECT_EQ(Refusal(Replaced(text, "<saml2:SubjectConfirmationData ",
+                             "<saml2:NameID/><saml2:SubjectConfirmationData ")),
+            "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:other'");
+  EXPECT_EQ(Refusal(Replaced(text, "alice@example.com", "alice")),
+            "Failed to parse the UPN NameID: `alice'; name or domain part is missing.");
 }
 
 TEST(ReadSubject, RefusesASecondCertificateOrConfirmation) {
@@ -159,10 +196,12 @@ TEST(ReadSubject, RefusesMissingParts) {
   EXPECT_EQ(
       Refusal(Replaced(BearerText(), R"( Method="urn:oasis:names:tc:SAML:2.0:cm:bearer")", "")),
       "Node 'saml2:SubjectConfirmation is missing required attribute 'Method'");
-  EXPECT_EQ(Refusal(Replaced(BearerText(), " NotOnOrAfter=\"2024-03-05T08:00:00.000Z\"", "")),
-            "Node 'saml2:SubjectConfirmationData is missing required attribute 'NotOnOrAfter'");
-  EXPECT_EQ(Refusal(Replaced(BearerText(), "2024-03-05T08:00:00.000Z", "later")),
-            "saml2:SubjectConfirmationData/@NotOnOrAfter is not a date");
+  for (const std::string& text : {BearerText(), HolderOfKeyText()}) {
+    EXPECT_EQ(Refusal(Replaced(text, " NotOnOrAfter=\"2024-03-05T08:00:00.000Z\"", "")),
+              "Node 'saml2:SubjectConfirmationData is missing required attribute 'NotOnOrAfter'");
+    EXPECT_EQ(Refusal(Replaced(text, "2024-03-05T08:00:00.000Z", "later")),
+              "saml2:SubjectConfirmationData/@NotOnOrAfter is not a date");
+  }
   EXPECT_EQ(Refusal(Replaced(BearerText(),
                              "<saml2:SubjectConfirmationData "
                              "NotOnOrAfter=\"2024-03-05T08:00:00.000Z\"/>",

@@ -84,6 +84,37 @@ TEST(ReadSignature, TellsThePlatformsSyntaxFault) {
   }
 }
 
+std::string WithKeyInfo(const std::string& signature, const std::string& content) {
+  return Replaced(signature, "</ds:SignatureValue>",
+                  "</ds:SignatureValue><ds:KeyInfo>" + content + "</ds:KeyInfo>");
+}
+
+TEST(ReadSignature, RefusesSamlElementsAnywhereInKeyInfo) {
+  for (const char* content :
+       {"<saml2:Assertion/>", "<saml2:Anything/>",
+        "<Assertion xmlns=\"urn:oasis:names:tc:SAML:2.0:assertion\"/>",
+        "<ds:KeyName>k</ds:KeyName><saml2:Assertion/>",
+        "<x>text<!--c--><y><saml2:Assertion/></y></x>", "<x><y/></x><z/><saml2:Assertion/>",
+        "<x><y/>text<saml2:Assertion/></x><z/>"}) {
+    EXPECT_EQ(Refusal(WithKeyInfo(MadeUpSignature("#_a1"), content)),
+              "Token's signature must not hold SAML elements")
+        << content;
+  }
+  for (const char* content :
+       {"<ds:KeyName>k</ds:KeyName>", "<Assertion/>", "<x>text<y/><!--c--></x><z><y>t</y></z>",
+        "<saml:Assertion xmlns:saml=\"urn:oasis:names:tc:SAML:1.0:assertion\"/>"}) {
+    ExpectCovers(WithKeyInfo(MadeUpSignature("#_a1"), content));
+  }
+}
+
+TEST(ReadSignature, JudgesFormThenCoverageThenKeyInfo) {
+  const std::string uncovering = WithKeyInfo(MadeUpSignature("#other"), "<saml2:Assertion/>");
+  EXPECT_EQ(Refusal(Replaced(uncovering, "<ds:DigestValue>AA", "<ds:DigestValue>AA<!---->"))
+                .rfind("Signature syntax error: ", 0),
+            0U);
+  EXPECT_EQ(Refusal(uncovering), "Token's signature must cover the entire token");
+}
+
 // A signature whose verdict the test gives.
 class FakeSignature final : public Signature, public Tarnik::ObjectImpl {
  public:

@@ -121,6 +121,17 @@ INSTANTIATE_TEST_SUITE_P(
         ClockCase{kStart + 1, kShortest, kInFuture},
         ClockCase{kEnd + 1, kLongest / kSecond + 1, ""}));
 
+// The text form of a time tells it in the zone that it was written in.
+TEST(CheckValidity, NamesTimesAsTheTokenWroteThem) {
+  ParsedAssertion assertion = ValidAssertion();
+  assertion.conditions.notBefore = DateTime::Parse("2024-03-05T09:08:09.010+02:00");
+  assertion.conditions.notOnOrAfter = DateTime::Parse("2024-03-05T03:08:09.010-05:00");
+  EXPECT_EQ(Refusal(assertion, 0, kStart - 1),
+            "Token start date is in the future: 2024-03-05T09:08:09.010+02:00");
+  EXPECT_EQ(Refusal(assertion, 0, kEnd), "The token has expired at: 2024-03-05T03:08:09.010-05:00");
+  EXPECT_EQ(Refusal(assertion, 0, kEnd - 1), "");
+}
+
 TEST(CheckValidity, WantsABearerConfirmationAsLongAsTheToken) {
   ParsedAssertion assertion = ValidAssertion();
   EXPECT_EQ(Refusal(assertion), "");
