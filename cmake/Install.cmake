@@ -15,7 +15,7 @@ function(ssoclient_install_package)
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}Config.cmake" INSTALL_DESTINATION ${cmake_dir})
   write_basic_package_version_file(
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"
-    VERSION ${PROJECT_VERSION} COMPATIBILITY SameMinorVersion)
+    VERSION ${PROJECT_VERSION} COMPATIBILITY SameMajorVersion)
   install(FILES
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}Config.cmake"
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"

@@ -1,0 +1,48 @@
+#include <ssoclient/gssapi_negotiation_handler.h>
+#include <ssoclient/ssoclient.h>
+
+#include <iostream>
+#include <string>
+
+namespace {
+
+bool RefusesWhatIsNoService() {
+  try {
+    SsoClient::CreateGssapiNegotiationHandler({});
+  } catch (const Tarnik::InvalidArgumentException& e) {
+    return std::string(e.what()) ==
+           "GssapiNegotiationConfig: the target service must not be empty.";
+  }
+  return false;
+}
+
+bool TellsThatThereAreNoTickets() {
+  SsoClient::GssapiNegotiationConfig config;
+  config.targetService = "HTTP@sts.example";
+  config.credentialCache = "FILE:/nonexistent/cache";
+  const auto handler = SsoClient::CreateGssapiNegotiationHandler(config);
+
+  SsoClient::SecurityTokenServiceConfig serviceConfig;
+  serviceConfig.url = "http://127.0.0.1:1/sts";
+  serviceConfig.tokenFactory = SsoClient::CreateSamlTokenFactory(nullptr);
+  const auto service = SsoClient::CreateSecurityTokenService(serviceConfig);
+  SsoClient::TokenSpec spec;
+  spec.tokenLifetimeSec = 60;
+  try {
+    service->AcquireTokenByGSS(spec, *handler);
+  } catch (const SsoClient::SsoException& e) {
+    return std::string(e.what()).find("There are no credentials to log in with: ") == 0;
+  }
+  return false;
+}
+
+}  // namespace
+
+int main() {
+  if (!RefusesWhatIsNoService() || !TellsThatThereAreNoTickets()) {
+    std::cerr << "The installed Kerberos library does not behave.\n";
+    return 1;
+  }
+  std::cout << "The installed Kerberos library works.\n";
+  return 0;
+}
