@@ -48,6 +48,14 @@ TEST_F(TransportCallsTest, AnHttpsUrlMakesATlsSpec) {
   }
 }
 
+TEST_F(TransportCallsTest, AClientHoldsItsSpecForItsLifetime) {
+  {
+    const HttpsClient client(kHttps, sslContext_.get(), "", kTimeout, false);
+    EXPECT_EQ(Recorded().lastSpec->RefCount(), 2);
+  }
+  EXPECT_EQ(Recorded().lastSpec->RefCount(), 1);
+}
+
 TEST_F(TransportCallsTest, EachSessionHasAnAgentAndCookiesOfItsOwn) {
   const HttpsClient client(kHttps, sslContext_.get(), "", kTimeout, false);
   Recorded().log.clear();
@@ -145,6 +153,7 @@ TEST_F(TransportCallsTest, ANegotiationGivesEachLeg40SecondsOnOneSessionAndSetsN
   EXPECT_THAT(Recorded().log, ElementsAre("TLS spec: sts.example:8443, flag not set, peer 'peer'",
                                           "cookie store ''", kOwnAgent));
   EXPECT_EQ(Recorded().lastSslContext, sslContext_.get());
+  EXPECT_EQ(Recorded().lastSpec->RefCount(), 1);  // the client is gone, and the session goes on
   EXPECT_THROW(context->Negotiate({1}), Tarnik::Exception);
   EXPECT_THROW(context->Negotiate({1}), Tarnik::Exception);
   ASSERT_THAT(Recorded().agents, SizeIs(1));
