@@ -49,6 +49,15 @@ class RecordingRequest final : public Tarnik::Http::ClientRequest, public Tarnik
 
 }  // namespace
 
+void RecordingSocket::ConnectAsync(const std::string& host, int port, ConnectCompletion connected) {
+  Log("connect to " + host + ":" + std::to_string(port));
+  completion = std::move(connected);
+}
+
+void RecordingSocket::Close() noexcept {
+  Log("close");
+}
+
 RecordedCalls& Recorded() {
   static RecordedCalls calls;
   return calls;
@@ -109,6 +118,11 @@ void CreateHttpRequest(Method method, const std::string& target, Ref<ClientReque
 }  // namespace Tarnik::Http
 
 namespace Tarnik::System {
+
+Ref<TCPClientSocket> CreateTCPClientSocket(ThreadPool* pool) {
+  SsoClient::Testing::Log(pool == GetThreadPool().get() ? "socket of the pool" : "other socket");
+  return SsoClient::Testing::Recorded().lastSocket = MakeRef<SsoClient::Testing::RecordingSocket>();
+}
 
 DateTime GetUtcDateTime() {
   constexpr long kSecond = 1'000'000;
