@@ -1,7 +1,5 @@
 #include "xml/element_builder_impl.h"
 
-#include <tarnik/core/exception.h>
-
 namespace SsoClient {
 
 ElementBuilderImpl::ElementBuilderImpl(std::string_view prefix, std::string_view localName,
@@ -17,13 +15,7 @@ void CreateElementWithAttributes(const std::string& prefix, const std::string& l
                                  Tarnik::Ref<Tarnik::Xml::ElementNode>& out) {
   Tarnik::Xml::CreateElementNode(prefix, localName, out);
   for (const auto& [name, value] : attributes) {
-    try {
-      out->SetAttribute(name, value);
-    } catch (const Tarnik::InvalidArgumentException& error) {
-      throw Tarnik::InvalidArgumentException("Attribute '" + name + "' of element '" +
-                                             std::string(out->QualifiedNameText()) +
-                                             "' cannot be sent: " + error.Message());
-    }
+    out->SetAttribute(name, value);
   }
 }
 

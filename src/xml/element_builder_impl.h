@@ -23,9 +23,9 @@ class ElementBuilderImpl final : public XMLBaseBuilder {
   AttributeMap attributes_;
 };
 
-/// Makes the element that both kinds of element builder start from. Throws
-/// `Tarnik::InvalidArgumentException`, naming element and attribute but never the value, when XML
-/// cannot carry a value.
+/// Makes the element that both kinds of element builder start from. What the platform throws passes
+/// unchanged: `Tarnik::InvalidArgumentException`, naming element and attribute but never the value,
+/// when XML cannot carry a value.
 void CreateElementWithAttributes(const std::string& prefix, const std::string& localName,
                                  const AttributeMap& attributes,
                                  Tarnik::Ref<Tarnik::Xml::ElementNode>& out);

@@ -1,6 +1,5 @@
 #include "xml/text_element_builder_impl.h"
 
-#include <tarnik/core/exception.h>
 #include <tarnik/text/string_util.h>
 #include <tarnik/xml/character_nodes.h>
 
@@ -24,15 +23,9 @@ void TextElementBuilderImpl::Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) c
   CreateElementWithAttributes(prefix_, localName_, attributes_, out);
   Tarnik::Ref<Tarnik::Xml::TextNode> text;
   Tarnik::Xml::CreateTextNode(text);
-  try {
-    text->SetText(text_);
-  } catch (const Tarnik::InvalidArgumentException& error) {
-    // A text node does not know its element, and the caller must learn which argument is at fault.
-    throw Tarnik::InvalidArgumentException("The text of element '" +
-                                           std::string(out->QualifiedNameText()) +
-                                           "' cannot be sent: " + error.Message());
-  }
+  // Before it has its text: what a text node refuses it tells by the element that holds it.
   out->AppendChild(text.get());
+  text->SetText(text_);
 }
 
 }  // namespace SsoClient

@@ -17,8 +17,8 @@ class TextElementBuilderImpl final : public XMLBaseBuilder {
                          const AttributeList& attributes);
   ~TextElementBuilderImpl() override;
 
-  /// Throws `Tarnik::InvalidArgumentException`, naming the element but never the text, when XML
-  /// cannot carry the text.
+  /// Passes on the platform's `Tarnik::InvalidArgumentException`, which names the element but never
+  /// the text, when XML cannot carry the text.
   void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const override;
 
  private:

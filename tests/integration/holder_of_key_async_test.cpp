@@ -180,7 +180,8 @@ std::vector<Trouble> Troubles() {
        "Token lifetime must be positive",
        [](DevSts::Server&, Arguments& arguments) { arguments.spec.tokenLifetimeSec = 0; }, false},
       {"Unsendable", typeid(Tarnik::InvalidArgumentException),
-       "The text of element 'wsa:Address' cannot be sent: ",
+       "The text of element 'wsa:Address' holds what XML cannot carry: a control character or "
+       "bytes that are not UTF-8.",
        [](DevSts::Server&, Arguments& arguments) {
          arguments.spec.audienceRestriction = {std::string(1, '\1')};
        },

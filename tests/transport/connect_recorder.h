@@ -6,6 +6,7 @@
 #include <memory>
 #include <stdexcept>
 #include <string>
+#include <thread>
 #include <utility>
 
 #include <tarnik/core/exception.h>
@@ -23,6 +24,7 @@ class ConnectRecorder {
     auto token = std::make_shared<Token>(gone_);
     return [this, token](Tarnik::System::Stream* stream, Tarnik::Exception* error) {
       ++calls;
+      isOnCallersThread = std::this_thread::get_id() == caller_;
       lastStream = stream;
       hasError = error != nullptr;
       if (error != nullptr) {
@@ -40,6 +42,7 @@ class ConnectRecorder {
 
   int calls = 0;
   Tarnik::Ref<Tarnik::System::Stream> lastStream;
+  bool isOnCallersThread = false;
   bool hasError = false;
   bool isCancelled = false;
   std::string message;
@@ -56,6 +59,7 @@ class ConnectRecorder {
     std::shared_ptr<std::promise<void>> gone_;
   };
 
+  std::thread::id caller_ = std::this_thread::get_id();
   std::shared_ptr<std::promise<void>> gone_ = std::make_shared<std::promise<void>>();
   std::future<void> future_ = gone_->get_future();
 };

@@ -2,9 +2,12 @@
 
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>
+#include <tarnik/http/http_url.h>
 
 #include <string>
+#include <type_traits>
 
+#include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 #include "transport/fake_http.h"
 #include "transport/fake_ssl.h"
@@ -16,6 +19,7 @@ namespace {
 
 using testing::HasSubstr;
 using testing::Not;
+using TestSupport::ThrownMessage;
 
 constexpr unsigned long kTimeout = 240'000'000;
 
@@ -28,23 +32,21 @@ std::string Send(TransportSession& session) {
 }
 
 std::string ConstructionFailure(const std::string& url, Tarnik::Ssl::SSLContext* context) {
-  try {
-    const HttpsClient client(url, context, "", kTimeout, false);
-  } catch (const Tarnik::InvalidArgumentException& error) {
-    return error.Message();
-  }
-  return "none";
+  return ThrownMessage<Tarnik::InvalidArgumentException>(
+      [&] { const HttpsClient client(url, context, "", kTimeout, false); });
 }
 
+constexpr char kNoFailure[] = "Nothing was thrown.";
+
 TEST(HttpsClientTest, PlainHttpNeedsNoSslContext) {
-  EXPECT_EQ(ConstructionFailure("http://sts.example/path", nullptr), "none");
+  EXPECT_EQ(ConstructionFailure("http://sts.example/path", nullptr), kNoFailure);
 }
 
 TEST(HttpsClientTest, HttpsNeedsAnSslContext) {
   EXPECT_EQ(ConstructionFailure("https://sts.example/path", nullptr),
             "HTTPS connection requested but no SSLContext provided.");
   const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
-  EXPECT_EQ(ConstructionFailure("https://sts.example/path", context.get()), "none");
+  EXPECT_EQ(ConstructionFailure("https://sts.example/path", context.get()), kNoFailure);
 }
 
 TEST(HttpsClientTest, KeepsTheSslContextAliveAndDropsItWithItself) {
@@ -56,11 +58,18 @@ TEST(HttpsClientTest, KeepsTheSslContextAliveAndDropsItWithItself) {
   EXPECT_EQ(context->RefCount(), 1);
 }
 
-TEST(HttpsClientTest, MalformedUrlsAreRefused) {
-  for (const std::string url : {"", "sts.example", "ftp://sts.example/", "http://", "http:///path",
-                                "http://a b/", "http://a/\r\nX: 1", "http://a:99999/"}) {
-    EXPECT_THROW(HttpsClient(url, nullptr, "", kTimeout, false), Tarnik::InvalidArgumentException)
-        << url;
+TEST(HttpsClientTest, PassesOnWhatTheUrlParserRefuses) {
+  for (const std::string url :
+       {"", "sts.example", "ftp://sts.example/", "http://", "http:///path", "http://a b/",
+        "http://a/\r\nX: 1", "http://a:99999/", "https://", "https://a:0/"}) {
+    bool isHttps = false;
+    std::string host;
+    int port = 0;
+    std::string path;
+    const auto refusal = ThrownMessage<Tarnik::InvalidArgumentException>(
+        [&] { Tarnik::Http::ParseHttpURL(url, isHttps, host, port, path); });
+    EXPECT_NE(refusal, kNoFailure) << url;
+    EXPECT_EQ(ConstructionFailure(url, nullptr), refusal) << url;
   }
 }
 
@@ -141,15 +150,13 @@ TEST(HttpsClientTest, GivesSessionsItsPathAndTimeOut) {
 }
 
 TEST(HttpsClientTest, RefusesANullUserAgent) {
-  try {
-    const HttpsClient client(nullptr, "/", kTimeout);
-    FAIL();
-  } catch (const Tarnik::InvalidArgumentException& error) {
-    EXPECT_EQ(error.Message(), "The HTTP user agent must not be null.");
-  }
+  EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
+                [] { const HttpsClient client(nullptr, "/", kTimeout); }),
+            "The HTTP user agent must not be null.");
 }
 
 TEST(HttpsClientTest, CreateSessionIsTheOneSlot) {
+  static_assert(!std::has_virtual_destructor_v<Transport>);
   const auto agent = Tarnik::MakeRef<Testing::FakeUserAgent>();
   const HttpsClient client(agent.get(), "/", kTimeout);
   const Transport& transport = client;

@@ -8,6 +8,8 @@
 #include <memory>
 #include <stdexcept>
 #include <string>
+#include <thread>
+#include <type_traits>
 
 #include "support/vtable_slot.h"
 #include "transport/connection_specs.h"
@@ -175,6 +177,20 @@ TEST_F(HttpsSessionAsyncTest, ReportsTheAnswerOnce) {
   EXPECT_EQ(body_, "answer");
 }
 
+TEST_F(HttpsSessionAsyncTest, LetsGoOfTheAnswerBehindTheCallback) {
+  long during = 0;
+  session_.SendRequestAsync(
+      request_,
+      [&during](const Tarnik::Exception*, Tarnik::Reader* reader) { during = reader->RefCount(); },
+      handle_);
+  const auto response = Tarnik::MakeRef<Testing::FakeResponse>(200, "OK", "answer");
+  const auto body = response->Body();
+  const long before = body->RefCount();
+  Complete(nullptr, response.get());
+  EXPECT_EQ(during, before + 1);
+  EXPECT_EQ(body->RefCount(), before);
+}
+
 TEST_F(HttpsSessionAsyncTest, ReportsAPlatformFailure) {
   Send();
   Tarnik::CancelledException error("called off");
@@ -199,6 +215,7 @@ TEST_F(HttpsSessionAsyncTest, AnEmptyCallbackFailsWhenTheExchangeEnds) {
 }
 
 TEST_F(HttpsSessionTest, OperationsStandInTheirOrder) {
+  static_assert(!std::has_virtual_destructor_v<TransportSession>);
   const TransportSession& session = session_;
   using Send = void(const void*, const SoapRequest&, Tarnik::Ref<Tarnik::Reader>&);
   Tarnik::Ref<Tarnik::Reader> reader;
@@ -211,6 +228,28 @@ TEST_F(HttpsSessionTest, OperationsStandInTheirOrder) {
   EXPECT_EQ(handle, agent_->item);
 }
 
+/// Sends in either way and gives the body of the answer.
+std::string SendNow(const HttpsSession& session, const SoapRequest& request) {
+  Tarnik::Ref<Tarnik::Reader> reader;
+  session.SendRequest(request, reader);
+  return Testing::ReadAll(*reader);
+}
+
+std::string SendLater(const HttpsSession& session, const SoapRequest& request) {
+  const auto body = std::make_shared<std::promise<std::string>>();
+  Tarnik::Ref<PendingRequestItem> handle;
+  session.SendRequestAsync(
+      request,
+      [body, caller = std::this_thread::get_id()](const Tarnik::Exception* error,
+                                                  Tarnik::Reader* reader) {
+        EXPECT_NE(std::this_thread::get_id(), caller);
+        body->set_value(error != nullptr ? error->Message() : Testing::ReadAll(*reader));
+      },
+      handle);
+  EXPECT_NE(handle, nullptr);
+  return body->get_future().get();
+}
+
 TEST(HttpsSessionWireTest, PostsTheEnvelopeWithTheTwoHeadersInOrder) {
   const Testing::LoopbackServer server([](const std::string&) { return Testing::OkAnswer("ok"); });
   Tarnik::Ref<Tarnik::Http::ConnectionSpec> spec;
@@ -220,36 +259,19 @@ TEST(HttpsSessionWireTest, PostsTheEnvelopeWithTheTwoHeadersInOrder) {
   SoapRequest request;
   request.action = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
   request.body = std::string("<a>\r\n\xc3\xa9\0</a>", 13);
-  Tarnik::Ref<Tarnik::Reader> reader;
-  session.SendRequest(request, reader);
-  EXPECT_EQ(Testing::ReadAll(*reader), "ok");
+  EXPECT_EQ(SendNow(session, request), "ok");
+  EXPECT_EQ(SendLater(session, request), "ok");
 
-  ASSERT_EQ(server.Requests().size(), 1U);
-  const std::string received = server.Requests()[0];
-  EXPECT_EQ(received.substr(0, received.find("\r\n")), "POST /sts/STSService?x=1 HTTP/1.1");
-  EXPECT_THAT(received, testing::HasSubstr(
-                            "\r\nContent-Type: text/xml\r\nSOAPAction: "
-                            "\"http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue\"\r\n"));
-  EXPECT_EQ(received.substr(received.find("\r\n\r\n") + 4), request.body);
-}
-
-TEST(HttpsSessionWireTest, ReportsFromAnotherThread) {
-  const Testing::LoopbackServer server([](const std::string&) { return Testing::OkAnswer("ok"); });
-  Tarnik::Ref<Tarnik::Http::ConnectionSpec> spec;
-  CreateSsoConnectionSpec("127.0.0.1", server.Port(), false, spec);
-  const HttpsSession session(Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr), "/",
-                             kTimeout);
-  const SoapRequest request;
-  const auto body = std::make_shared<std::promise<std::string>>();
-  Tarnik::Ref<PendingRequestItem> handle;
-  session.SendRequestAsync(
-      request,
-      [body](const Tarnik::Exception* error, Tarnik::Reader* reader) {
-        body->set_value(error != nullptr ? error->Message() : Testing::ReadAll(*reader));
-      },
-      handle);
-  EXPECT_NE(handle, nullptr);
-  EXPECT_EQ(body->get_future().get(), "ok");
+  const auto requests = server.Requests();
+  ASSERT_EQ(requests.size(), 2U);
+  for (const auto& received : requests) {
+    EXPECT_EQ(received.substr(0, received.find("\r\n")), "POST /sts/STSService?x=1 HTTP/1.1");
+    EXPECT_THAT(
+        received,
+        testing::HasSubstr("\r\nContent-Type: text/xml\r\nSOAPAction: "
+                           "\"http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue\"\r\n"));
+    EXPECT_EQ(received.substr(received.find("\r\n\r\n") + 4), request.body);
+  }
 }
 
 TEST(HttpsSessionWireTest, ASilentServerRunsIntoTheLimit) {

@@ -10,6 +10,15 @@
 namespace SsoClient {
 namespace {
 
+TEST(SoapRequestTest, HoldsTheActionAndThenTheBody) {
+  SoapRequest request;
+  request.action = "the action";
+  request.body = "the body";
+  const auto& [first, second] = request;
+  EXPECT_EQ(first, "the action");
+  EXPECT_EQ(second, "the body");
+}
+
 TEST(SoapRequestTest, CleansesItsBodyWhenItDies) {
   const std::string secret = "hunter2-secret";  // short enough to stand in the string object itself
   alignas(SoapRequest) std::array<unsigned char, sizeof(SoapRequest)> storage{};

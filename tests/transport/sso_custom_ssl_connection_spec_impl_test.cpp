@@ -1,6 +1,7 @@
 #include "transport/sso_custom_ssl_connection_spec_impl.h"
 
 #include <gmock/gmock.h>
+#include <tarnik/system/tcp_client_socket.h>
 
 #include <chrono>
 #include <future>
@@ -59,6 +60,7 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, RunsAHandshakeWithHostAndServerName) 
     recorder.Wait();
     EXPECT_EQ(recorder.calls, 1);
     EXPECT_FALSE(recorder.hasError) << recorder.message;
+    EXPECT_FALSE(recorder.isOnCallersThread);
     EXPECT_NE(dynamic_cast<Testing::FakeSslStream*>(recorder.lastStream.get()), nullptr);
     EXPECT_EQ(context_->label, "");
     EXPECT_EQ(context_->host, "127.0.0.1");
@@ -103,6 +105,20 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, AFailedConnectNeverStartsAHandshake) 
   recorder.Wait();
   EXPECT_EQ(recorder.calls, 1);
   EXPECT_TRUE(recorder.hasError);
+  EXPECT_EQ(recorder.message,
+            "Cannot connect to 127.0.0.1:" + std::to_string(deaf.Port()) + ": Connection refused");
+  EXPECT_NE(dynamic_cast<Tarnik::System::TCPClientSocket*>(recorder.lastStream.get()), nullptr);
+  EXPECT_EQ(context_->wraps, 0);
+}
+
+TEST_F(SsoCustomSslConnectionSpecImplTest, CancellingClosesTheSocketAndStartsNoHandshake) {
+  const Testing::FullListener listener;
+  Testing::ConnectRecorder recorder;
+  const auto item = MakeSpec("127.0.0.1", listener.Port())->StartConnect(recorder.Completion());
+  EXPECT_TRUE(item->Cancel());
+  recorder.Wait();
+  EXPECT_EQ(recorder.calls, 1);
+  EXPECT_TRUE(recorder.isCancelled) << recorder.message;
   EXPECT_EQ(context_->wraps, 0);
 }
 

@@ -87,6 +87,11 @@ TEST(IssueBodyTest, EveryOptionHasItsPlace) {
                     "<rsa-advice:Advice AdviceSource=\"S1\"/></rsa-advice:AdviceSet>"));
 }
 
+TEST(IssueBodyTest, TheAdviceNamespaceIsTheVendors) {
+  EXPECT_THAT(kVendorAdviceNamespace,
+              testing::MatchesRegex("http://[^/]+/names/2009/12/std-ext/WS-Trust1[.]4/advice"));
+}
+
 TEST(IssueBodyTest, AnyKeyTypeButZeroAsksForAPublicKey) {
   EXPECT_THAT(BodyXml(0, PlainSpec()), HasSubstr("/Bearer</wst:KeyType>"));
   EXPECT_THAT(BodyXml(1, PlainSpec()), HasSubstr("/PublicKey</wst:KeyType>"));

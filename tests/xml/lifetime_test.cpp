@@ -4,6 +4,7 @@
 
 #include <limits>
 
+#include "support/local_zone.h"
 #include "xml/built_xml.h"
 
 namespace SsoClient {
@@ -22,7 +23,8 @@ Times BuiltTimes(std::int64_t seconds) {
   return {Testing::TimeAt(*element, {"Created"}), Testing::TimeAt(*element, {"Expires"})};
 }
 
-TEST(LifetimeTest, HoldsCreatedThenExpires) {
+TEST(LifetimeTest, HoldsCreatedThenExpiresInUtc) {
+  const TestSupport::LocalZone zone;
   EXPECT_EQ(Testing::WithoutTimes(Testing::BuiltXml(*BuildLifetime(600))),
             "<wst:Lifetime xmlns:wsu=\"http://docs.oasis-open.org/wss/2004/01/"
             "oasis-200401-wss-wssecurity-utility-1.0.xsd\">"

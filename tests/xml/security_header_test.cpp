@@ -2,6 +2,7 @@
 
 #include <gmock/gmock.h>
 
+#include "support/local_zone.h"
 #include "xml/builder_factories.h"
 #include "xml/built_xml.h"
 
@@ -10,7 +11,8 @@ namespace {
 
 using Tarnik::System::GetUtcDateTime;
 
-TEST(SecurityHeaderTest, HoldsATimestampAndThenWhatIsAdded) {
+TEST(SecurityHeaderTest, HoldsATimestampInUtcAndThenWhatIsAdded) {
+  const TestSupport::LocalZone zone;
   const auto header = BuildSecurityHeader(10);
   header->Add(MakeElementBuilder("", "Token"));
   EXPECT_EQ(Testing::WithoutTimes(Testing::BuiltXml(*header)),
@@ -30,6 +32,14 @@ TEST(SecurityHeaderTest, IsValidFromNowForTheMinutesAsked) {
   EXPECT_LE(before, created / 1000);
   EXPECT_LE(created / 1000, after);
   EXPECT_EQ(expires - created, 600'000'000);
+}
+
+TEST(SecurityHeaderTest, WrapsMoreThan35Minutes) {
+  const auto header = Testing::Built(*BuildSecurityHeader(36));
+  // What is written has no microseconds.
+  EXPECT_NEAR(Testing::TimeAt(*header, {"Timestamp", "Expires"}).GetUtcTime() -
+                  Testing::TimeAt(*header, {"Timestamp", "Created"}).GetUtcTime(),
+              2'160'000'000 - 4'294'967'296, 1000);
 }
 
 }  // namespace

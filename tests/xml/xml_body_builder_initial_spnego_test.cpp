@@ -44,6 +44,22 @@ TEST(XMLBodyBuilderInitialSPNegoTest, TheUseKeyStandsBeforeTheLeg) {
               Not(HasSubstr("UseKey")));
 }
 
+TEST(XMLBodyBuilderInitialSPNegoTest, KeepsACopyOfTheSpecAndTheLeg) {
+  auto spec = Spec();
+  std::vector<unsigned char> leg{1};
+  const XMLBodyBuilderInitialSPNego builder(0, spec, leg);
+  spec.renewable = true;
+  leg.clear();
+  const auto xml = Testing::BuiltXml(builder);
+  EXPECT_THAT(xml, HasSubstr("<wst:Renewing Allow=\"false\" OK=\"false\"/>"));
+  EXPECT_THAT(xml, HasSubstr(">AQ==</wst:BinaryExchange></wst:RequestSecurityToken>"));
+}
+
+TEST(XMLBodyBuilderInitialSPNegoTest, AnEmptyLegIsSentEmpty) {
+  EXPECT_THAT(Testing::BuiltXml(XMLBodyBuilderInitialSPNego(0, Spec(), {})),
+              HasSubstr(Testing::BuiltXml(*BuildBinaryExchange({}))));
+}
+
 TEST(XMLBodyBuilderInitialSPNegoTest, EachBuildDrawsANewContext) {
   const XMLBodyBuilderInitialSPNego builder(0, Spec(), {1});
   const auto first = ContextOf(*Testing::Built(builder));

@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include <stdexcept>
+#include <thread>
 
 #include "support/vtable_slot.h"
 #include "xml/builder_factories.h"
@@ -61,10 +62,62 @@ class FailingBuilder final : public XMLBaseBuilder {
   }
 };
 
-TEST(XMLCompositeBuilderTest, FailuresOfAChildPassUnchanged) {
+TEST(XMLCompositeBuilderTest, FailuresOfAChildPassUnchangedAndLeaveAPart) {
   XMLCompositeBuilder builder(MakeElementBuilder("", "Root"));
-  builder.Add(std::make_shared<FailingBuilder>());
-  EXPECT_THROW(Testing::Built(builder), std::runtime_error);
+  builder.Add(MakeElementBuilder("", "First"))
+      .Add(std::make_shared<FailingBuilder>())
+      .Add(MakeElementBuilder("", "Last"));
+  Tarnik::Ref<Tarnik::Xml::ElementNode> out;
+  try {
+    builder.Build(out);
+    FAIL();
+  } catch (const std::runtime_error& error) {
+    EXPECT_STREQ(error.what(), "no element today");
+  }
+  EXPECT_EQ(Testing::XmlText(out.get()), "<Root><First/></Root>");
+}
+
+/// Keeps what the output held before each build.
+class WatchingBuilder final : public XMLBaseBuilder {
+ public:
+  void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const override {
+    before.push_back(out);
+    Tarnik::Xml::CreateElementNode("", "E", out);
+  }
+
+  mutable std::vector<Tarnik::Ref<Tarnik::Xml::ElementNode>> before;
+};
+
+TEST(XMLCompositeBuilderTest, BuildsItsRootIntoTheOutputAndEachChildIntoAFreshReference) {
+  const auto watching = std::make_shared<WatchingBuilder>();
+  XMLCompositeBuilder builder(watching);
+  builder.Add(watching).Add(watching);
+  Tarnik::Ref<Tarnik::Xml::ElementNode> out;
+  Tarnik::Xml::CreateElementNode("", "Old", out);
+  const auto old = out;
+  builder.Build(out);
+  EXPECT_THAT(watching->before, testing::ElementsAre(old, nullptr, nullptr));
+  EXPECT_EQ(Testing::XmlText(out.get()), "<E><E/><E/></E>");
+}
+
+TEST(XMLCompositeBuilderTest, ManyThreadsMayBuildOneTree) {
+  XMLCompositeBuilder builder(MakeElementBuilder("a", "Root", {{"b", "c"}}));
+  builder.Add(MakeTextElementBuilder("a", "E", "text"));
+  constexpr int kBuilds = 100;
+  std::vector<std::vector<std::string>> built(4);
+  std::vector<std::thread> threads;
+  for (auto& texts : built) {
+    threads.emplace_back([&builder, &texts] {
+      for (int i = 0; i < kBuilds; ++i) {
+        texts.push_back(Testing::BuiltXml(builder));
+      }
+    });
+  }
+  for (auto& thread : threads) {
+    thread.join();
+  }
+  const std::vector<std::string> expected(kBuilds, R"(<a:Root b="c"><a:E>text</a:E></a:Root>)");
+  EXPECT_THAT(built, testing::Each(expected));
 }
 
 TEST(XMLBaseBuilderTest, BuildStandsFirstAndTheDestructorFollows) {

@@ -4,6 +4,8 @@
 
 #include <limits>
 
+#include "support/local_zone.h"
+
 namespace SsoClient {
 namespace {
 
@@ -59,6 +61,7 @@ TEST(XmlDateTimeTest, WrapsTheMicrosecondsBeyond35Minutes) {
 }
 
 TEST(XmlDateTimeTest, TellsTheSumInUtc) {
+  const TestSupport::LocalZone zone;
   EXPECT_EQ(FormatXmlDateTime(AddMinutes(DateTime::Parse("2024-03-05T07:08:09+01:00"), 1)),
             "2024-03-05T06:09:09.000Z");
 }

@@ -7,9 +7,11 @@
 
 #include "support/holder_of_key.h"
 #include "support/vtable_slot.h"
+#include "xml/binary_security_token.h"
 #include "xml/builder_factories.h"
 #include "xml/built_xml.h"
 #include "xml/namespaces.h"
+#include "xml/saml_token_reference.h"
 #include "xml/security_header.h"
 #include "xml/signed_soap_builders.h"
 
@@ -54,6 +56,14 @@ std::vector<std::string> ChildNames(const ElementNode& element) {
   return names;
 }
 
+std::vector<std::string> AttributeNames(const ElementNode& element) {
+  std::vector<std::string> names;
+  for (std::size_t i = 0; i < element.AttributeCount(); ++i) {
+    names.emplace_back(element.AttributeAt(i).Name());
+  }
+  return names;
+}
+
 std::string IdOf(const ElementNode& element) {
   return std::string(element.FindAttribute(kWsuNamespace, "Id").value_or("none"));
 }
@@ -61,6 +71,16 @@ std::string IdOf(const ElementNode& element) {
 Ref<Tarnik::Xml::Security::Signature> SignatureOf(const ElementNode& envelope) {
   return Tarnik::Xml::Security::CreateSignatureFromDom(
       At(envelope, {"Header", "Security"}).FirstChildElement("Signature"));
+}
+
+/// What ds:KeyInfo holds, all of it.
+std::string KeyInfoText(const ElementNode& envelope) {
+  std::string text;
+  const auto& keyInfo = At(envelope, {"Header", "Security", "Signature", "KeyInfo"});
+  for (auto* node = keyInfo.FirstChild(); node != nullptr; node = node->NextSibling()) {
+    text += Testing::XmlText(node);
+  }
+  return text;
 }
 
 TEST(XMLSignedSoapBuilderTest, SignsTheBodyAndThenTheTimestamp) {
@@ -97,15 +117,24 @@ TEST(XMLSignedSoapBuilderTest, TheSignatureIsTheLastOfTheHeaderAndBearsItsId) {
 
 TEST(XMLSignedSoapBuilderTest, TheCertificateFormRefersToTheCertificateInTheHeader) {
   const auto envelope = Testing::Built(*CertificateForm());
-  EXPECT_EQ(IdOf(At(*envelope, {"Header", "Security", "BinarySecurityToken"})),
-            "holderOfKeyCertificate");
-  EXPECT_EQ(
-      Testing::XmlText(At(*envelope, {"Header", "Security", "Signature", "KeyInfo"}).FirstChild()),
-      "<wsse:SecurityTokenReference xmlns:wsse=\"http://docs.oasis-open.org/wss/2004/01/"
-      "oasis-200401-wss-wssecurity-secext-1.0.xsd\">"
-      "<wsse:Reference URI=\"#holderOfKeyCertificate\""
-      " ValueType=\"http://docs.oasis-open.org/wss/2004/01/"
-      "oasis-200401-wss-x509-token-profile-1.0#X509v3\"/></wsse:SecurityTokenReference>");
+  EXPECT_EQ(Testing::XmlText(&At(*envelope, {"Header", "Security", "BinarySecurityToken"})),
+            Testing::BuiltXml(*BuildBinarySecurityToken(
+                "holderOfKeyCertificate", *Testing::ConfigOf(Credential()).certificate)));
+  EXPECT_EQ(KeyInfoText(*envelope),
+            "<wsse:SecurityTokenReference xmlns:wsse=\"http://docs.oasis-open.org/wss/2004/01/"
+            "oasis-200401-wss-wssecurity-secext-1.0.xsd\">"
+            "<wsse:Reference URI=\"#holderOfKeyCertificate\""
+            " ValueType=\"http://docs.oasis-open.org/wss/2004/01/"
+            "oasis-200401-wss-x509-token-profile-1.0#X509v3\"/></wsse:SecurityTokenReference>");
+}
+
+TEST(XMLSignedSoapBuilderTest, TheCertificateFormLeavesTheGivenHeaderAsItIs) {
+  const auto header = BuildSecurityHeader(10);
+  const auto config = Testing::ConfigOf(Credential());
+  const auto builder =
+      MakeSignedSoapBuilderForCertificate(header, Body(), config.privateKey, *config.certificate);
+  Testing::Built(*builder);
+  EXPECT_THAT(ChildNames(*Testing::Built(*header)), ElementsAre("wsu:Timestamp"));
 }
 
 TEST(XMLSignedSoapBuilderTest, TheTokenFormRefersToTheAssertion) {
@@ -116,9 +145,7 @@ TEST(XMLSignedSoapBuilderTest, TheTokenFormRefersToTheAssertion) {
       Testing::Built(*MakeSignedSoapBuilderForToken(header, Body(), config.privateKey, "_1"));
   EXPECT_THAT(ChildNames(At(*envelope, {"Header", "Security"})),
               ElementsAre("wsu:Timestamp", "Assertion", "ds:Signature"));
-  const auto& identifier = At(*envelope, {"Header", "Security", "Signature", "KeyInfo",
-                                          "SecurityTokenReference", "KeyIdentifier"});
-  EXPECT_EQ(Testing::XmlText(identifier.FirstChild()), "_1");
+  EXPECT_EQ(KeyInfoText(*envelope), Testing::BuiltXml(*BuildSamlTokenReference("_1")));
   const auto verdict =
       DevSts::VerifyXml(Testing::XmlText(envelope.get()), Credential().certificatePem);
   EXPECT_TRUE(verdict.valid) << verdict.reason;
@@ -130,10 +157,9 @@ TEST(XMLSignedSoapBuilderTest, NewIdsAreTheLocalNameAndAUuid) {
   EXPECT_THAT(IdOf(At(*envelope, {"Body"})), testing::MatchesRegex("Body[0-9a-f-]{36}"));
   EXPECT_THAT(IdOf(timestamp), testing::MatchesRegex("Timestamp[0-9a-f-]{36}"));
   // The declaration that is there already is not written twice.
-  EXPECT_EQ(timestamp.AttributeCount(), 2U);
-  const auto& body = At(*envelope, {"Body"});
-  EXPECT_EQ(body.AttributeAt(1).Name(), "xmlns:wsu");
-  EXPECT_EQ(body.AttributeAt(2).Name(), "wsu:Id");
+  EXPECT_THAT(AttributeNames(timestamp), ElementsAre("xmlns:wsu", "wsu:Id"));
+  EXPECT_THAT(AttributeNames(At(*envelope, {"Body"})),
+              ElementsAre("xmlns:wst", "xmlns:wsu", "wsu:Id"));
 }
 
 TEST(XMLSignedSoapBuilderTest, AnElementKeepsTheIdThatItHas) {
@@ -146,6 +172,25 @@ TEST(XMLSignedSoapBuilderTest, AnElementKeepsTheIdThatItHas) {
   const auto& timestamp = At(*envelope, {"Header", "Security", "Timestamp"});
   EXPECT_EQ(timestamp.AttributeCount(), 2U);
   EXPECT_EQ(SignatureOf(*envelope)->References()[1].uri, "#mine");
+}
+
+TEST(XMLSignedSoapBuilderTest, OnlyNamespacesTellTheTimestampAndItsId) {
+  auto security = MakeCompositeBuilder("s", "Security", {{"xmlns:s", kWsseNamespace}});
+  security->Add(MakeElementBuilder("x", "Timestamp", {{"x:Id", "x"}, {"xmlns:x", "urn:other"}}))
+      .Add(MakeElementBuilder(
+          "u", "Timestamp",
+          {{"Id", "plain"}, {"x:Id", "x"}, {"xmlns:u", kWsuNamespace}, {"xmlns:x", "urn:other"}}));
+  const XMLSignedSoapBuilder builder(security, Body(), Testing::ConfigOf(Credential()).privateKey,
+                                     nullptr);
+  const auto envelope = Testing::Built(builder);
+  const auto& header = At(*envelope, {"Header", "Security"});
+  EXPECT_EQ(Testing::XmlText(header.FirstChild()),
+            "<x:Timestamp x:Id=\"x\" xmlns:x=\"urn:other\"/>");
+  const auto& timestamp = *header.FirstChildElement(kWsuNamespace, "Timestamp");
+  EXPECT_THAT(AttributeNames(timestamp),
+              ElementsAre("Id", "x:Id", "xmlns:u", "xmlns:x", "xmlns:wsu", "wsu:Id"));
+  EXPECT_THAT(IdOf(timestamp), testing::MatchesRegex("Timestamp[0-9a-f-]{36}"));
+  EXPECT_EQ(SignatureOf(*envelope)->References()[1].uri, "#" + IdOf(timestamp));
 }
 
 TEST(XMLSignedSoapBuilderTest, WithoutAKeyInfoBuilderThereIsNoKeyInfo) {

@@ -1,0 +1,34 @@
+// Times that belong together come from one reading of the clock.
+#include <gmock/gmock.h>
+
+#include "calls/recorded_calls.h"
+#include "xml/built_xml.h"
+#include "xml/lifetime.h"
+#include "xml/security_header.h"
+
+namespace SsoClient {
+namespace {
+
+using testing::HasSubstr;
+
+class ClockCallsTest : public testing::Test {
+ protected:
+  ClockCallsTest() { Testing::ForgetCalls(); }
+};
+
+constexpr char kTimes[] =
+    "<wsu:Created>2024-03-05T07:08:09.010Z</wsu:Created>"
+    "<wsu:Expires>2024-03-05T07:18:09.010Z</wsu:Expires>";
+
+TEST_F(ClockCallsTest, ALifetimeBeginsAndEndsByOneReading) {
+  EXPECT_THAT(Testing::BuiltXml(*BuildLifetime(600)), HasSubstr(kTimes));
+  EXPECT_EQ(Testing::Recorded().clockReadings, 1);
+}
+
+TEST_F(ClockCallsTest, ATimestampBeginsAndEndsByOneReading) {
+  EXPECT_THAT(Testing::BuiltXml(*BuildSecurityHeader(10)), HasSubstr(kTimes));
+  EXPECT_EQ(Testing::Recorded().clockReadings, 1);
+}
+
+}  // namespace
+}  // namespace SsoClient
