@@ -266,7 +266,8 @@ TEST_F(NegotiationTest, RefusesATicketForAKeyThatItDoesNotHave) {
   options.negotiation.keytab = realm->AddKeytab("HTTP/elsewhere");
   const Server server(options);
   ExpectFault(LogIn(server, alice, kService), "wst:FailedAuthentication",
-              "The negotiation failed: ");
+              "The negotiation failed: Request ticket server HTTP/localhost@EXAMPLE.COM not found "
+              "in keytab (ticket kvno 2)");
 }
 
 TEST_F(NegotiationTest, RefusesATicketForALaterKey) {
@@ -275,7 +276,8 @@ TEST_F(NegotiationTest, RefusesATicketForALaterKey) {
   realm->AddKeytab("HTTP/changed");  // another key with a higher number
   const Server server(options);
   ExpectFault(LogIn(server, alice, "HTTP/changed@EXAMPLE.COM"), "wst:FailedAuthentication",
-              "The negotiation failed: ");
+              "The negotiation failed: Request ticket server HTTP/changed@EXAMPLE.COM kvno 3 not "
+              "found in keytab; keytab is likely out of date");
 }
 
 TEST_F(NegotiationTest, RefusesALegThatIsPlayedAgain) {
@@ -285,8 +287,8 @@ TEST_F(NegotiationTest, RefusesALegThatIsPlayedAgain) {
   const std::string leg = gss.Step();
   EXPECT_EQ(LoggedInAs(client.SendFirst(leg)), "alice@EXAMPLE.COM");
   NegotiationClient thief(server);
-  ExpectFault(thief.SendFirst(leg), "wst:FailedAuthentication", "The negotiation failed: ");
-  EXPECT_THAT(server.LastRequest().answeredFault, HasSubstr("replay"));
+  ExpectFault(thief.SendFirst(leg), "wst:FailedAuthentication",
+              "The negotiation failed: Request is a replay");
 }
 
 TEST_F(NegotiationTest, RefusesLegsThatAreNone) {
@@ -295,7 +297,8 @@ TEST_F(NegotiationTest, RefusesLegsThatAreNone) {
                                          std::string("\x60\x82\xff\xff", 4), kGoOn};
   for (const std::string& leg : legs) {
     NegotiationClient client(server);
-    ExpectFault(client.SendFirst(leg), "wst:InvalidRequest", "The negotiation failed: ");
+    ExpectFault(client.SendFirst(leg), "wst:InvalidRequest",
+                "The negotiation failed: Invalid token was supplied");
   }
   NegotiationClient client(server);
   ExpectFault(client.SendFirst(""), "wst:InvalidRequest", "The BinaryExchange holds no leg");
@@ -311,7 +314,8 @@ TEST_F(NegotiationTest, RefusesKerberosOutsideSpnego) {
   const std::size_t token = leg.find('\x60', 1);
   ASSERT_NE(token, std::string::npos);
   ExpectFault(client.SendFirst(leg.substr(token)), "wst:FailedAuthentication",
-              "The negotiation failed: ");
+              "The negotiation failed: No credentials were supplied, or the credentials were "
+              "unavailable or inaccessible");
 }
 
 TEST_F(NegotiationTest, KeepsNegotiationsApartThatAreMixed) {
