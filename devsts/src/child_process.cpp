@@ -77,6 +77,10 @@ pid_t Start(const Command& command) {
   if (process == 0) {
     // A test that crashes leaves nothing behind.
     ::prctl(PR_SET_PDEATHSIG, SIGKILL);
+    // What the caller blocks must still end the program.
+    sigset_t none;
+    ::sigemptyset(&none);
+    ::sigprocmask(SIG_SETMASK, &none, nullptr);
     ::dup2(input, STDIN_FILENO);
     ::dup2(output, STDOUT_FILENO);
     ::dup2(output, STDERR_FILENO);

@@ -15,19 +15,28 @@ gss_OID SpnegoMechanism() {
   return &mechanism;
 }
 
+GssCredentialHandle AcquireFrom(const std::string& keytab, gss_OID mechanism) {
+  gss_OID_set_desc mechanisms{1, mechanism};
+  gss_key_value_element_desc element{"keytab", keytab.c_str()};
+  const gss_key_value_set_desc store{1, &element};
+  GssCredentialHandle credential;
+  OM_uint32 minor = 0;
+  const OM_uint32 major =
+      gss_acquire_cred_from(&minor, GSS_C_NO_NAME, GSS_C_INDEFINITE, &mechanisms, GSS_C_ACCEPT,
+                            &store, credential.Address(), nullptr, nullptr);
+  RequireGss(major, minor);
+  return credential;
+}
+
 }  // namespace
 
 GssAcceptor::GssAcceptor(const std::string& keytab) {
-  gss_OID_set_desc spnego{1, SpnegoMechanism()};
-  gss_key_value_element_desc element{"keytab", keytab.c_str()};
-  const gss_key_value_set_desc store{1, &element};
+  // SPNEGO would not tell what it is that Kerberos lacks.
+  AcquireFrom(keytab, gss_mech_krb5);
+  credential_ = AcquireFrom(keytab, SpnegoMechanism());
   OM_uint32 minor = 0;
-  OM_uint32 major =
-      gss_acquire_cred_from(&minor, GSS_C_NO_NAME, GSS_C_INDEFINITE, &spnego, GSS_C_ACCEPT, &store,
-                            credential_.Address(), nullptr, nullptr);
-  RequireGss(major, minor);
   gss_OID_set_desc kerberos{1, gss_mech_krb5};
-  major = gss_set_neg_mechs(&minor, credential_.Get(), &kerberos);
+  const OM_uint32 major = gss_set_neg_mechs(&minor, credential_.Get(), &kerberos);
   RequireGss(major, minor);
 }
 

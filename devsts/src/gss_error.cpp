@@ -27,11 +27,14 @@ void RequireGss(OM_uint32 major, OM_uint32 minor) {
   if (GSS_ERROR(major) == 0) {
     return;
   }
-  std::string text = TextOf(major, GSS_C_GSS_CODE);
-  if (minor != 0) {
-    text += ": " + TextOf(minor, GSS_C_MECH_CODE);
+  // The text of a failure without a routine error of its own points to the mechanism's.
+  const std::string cause = minor != 0 ? TextOf(minor, GSS_C_MECH_CODE) : std::string();
+  if (GSS_ROUTINE_ERROR(major) == GSS_S_FAILURE && !cause.empty()) {
+    throw GssError(cause, major);
   }
-  throw GssError(text, major);
+  const std::string text = TextOf(major, GSS_C_GSS_CODE);
+  const bool tells = !cause.empty() && cause != TextOf(0, GSS_C_MECH_CODE);
+  throw GssError(tells ? text + ": " + cause : text, major);
 }
 
 }  // namespace DevSts

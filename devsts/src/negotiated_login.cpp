@@ -46,7 +46,7 @@ Octets NegotiatedLogin::TakeMechanismLeg(const Octets& leg) {
   if (isFirst && script_.requestMic) {
     mechTypes_ = MechTypesIn(leg);
     stage_ = Stage::Signature;
-    return WithState(std::move(answer), NegState::RequestMic);
+    return WithMic(answer, NegState::AcceptIncomplete, login_.MicOf(mechTypes_));
   }
   EndLogin();
   return answer;
@@ -59,7 +59,7 @@ Octets NegotiatedLogin::TakeSignature(const Octets& leg) {
   }
   login_.VerifyMic(mechTypes_, mic);
   EndLogin();
-  return WriteResponse(NegState::AcceptCompleted, login_.MicOf(mechTypes_));
+  return {};
 }
 
 Octets NegotiatedLogin::TakeMore() {

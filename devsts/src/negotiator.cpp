@@ -73,9 +73,7 @@ Negotiator::Negotiator(const NegotiationOptions& options)
 LegReply Negotiator::Begin(CheckedRequest request, IssueRequest issue,
                            const ReceivedRequest& received, const LegMisbehavior& misbehavior,
                            ServiceParts& parts, ReceivedLeg& seen) {
-  if (acceptor_ == nullptr) {
-    ThrowRequestFailed("This service does not negotiate: it has no keytab");
-  }
+  RequireAcceptor();
   RequireNoOtherLogin(request);
   const NegotiationLeg leg = *issue.leg;
   NegotiationStore::Turn turn = store_.Begin(
@@ -91,6 +89,7 @@ LegReply Negotiator::Begin(CheckedRequest request, IssueRequest issue,
 LegReply Negotiator::Continue(const CheckedRequest& request, const ReceivedRequest& received,
                               const LegMisbehavior& misbehavior, ServiceParts& parts,
                               ReceivedLeg& seen) {
+  RequireAcceptor();
   if (request.header.userNameToken || request.proof) {
     ThrowInvalidSecurity("Neither login nor signature is expected where a negotiation goes on");
   }
@@ -117,6 +116,12 @@ LegReply Negotiator::TakeLeg(NegotiationStore::Turn turn, const Octets& octets,
     turn.Keep(context);
   }
   return {WriteLegEnvelope(answer), {}, false};
+}
+
+void Negotiator::RequireAcceptor() const {
+  if (acceptor_ == nullptr) {
+    ThrowRequestFailed("This service does not negotiate: it has no keytab");
+  }
 }
 
 std::string Negotiator::UserOf(const std::string& principal, const Accounts& accounts) const {

@@ -36,6 +36,7 @@ class Negotiator {
   std::size_t Open() const { return store_.Size(); }
 
  private:
+  void RequireAcceptor() const;
   LegReply TakeLeg(NegotiationStore::Turn turn, const Octets& octets,
                    const LegMisbehavior& misbehavior, ServiceParts& parts, ReceivedLeg& seen);
   std::string UserOf(const std::string& principal, const Accounts& accounts) const;

@@ -90,6 +90,14 @@ Octets Wrapped(unsigned char tag, const Octets& content) {
   return octets;
 }
 
+Octets StateField(NegState state) {
+  return Wrapped(Field(0), Wrapped(kEnumerated, {static_cast<unsigned char>(state)}));
+}
+
+Octets Response(const Octets& fields) {
+  return Wrapped(Field(1), Wrapped(kSequence, fields));
+}
+
 }  // namespace
 
 Octets MechTypesIn(const Octets& firstLeg) {
@@ -104,15 +112,14 @@ Octets MechTypesIn(const Octets& firstLeg) {
   return {whole.begin(), whole.end()};
 }
 
-Octets WithState(Octets response, NegState state) {
-  const std::optional<View> field = FieldOf(ResponseFields(response), 0);
-  const View value = field ? ContentOf(*field, kEnumerated) : View();
-  if (value.size() != 1) {
-    throw SpnegoError("the state is missing");
-  }
-  response[static_cast<std::size_t>(value.data() - response.data())] =
-      static_cast<unsigned char>(state);
-  return response;
+Octets WithMic(const Octets& response, NegState state, const Octets& mic) {
+  View rest = ResponseFields(response);
+  ContentOf(Expect(rest, Field(0)).content, kEnumerated);
+  Octets fields = StateField(state);
+  fields.insert(fields.end(), rest.begin(), rest.end());
+  const Octets signature = Wrapped(Field(3), Wrapped(kOctetString, mic));
+  fields.insert(fields.end(), signature.begin(), signature.end());
+  return Response(fields);
 }
 
 Octets MicIn(const Octets& response) {
@@ -121,14 +128,8 @@ Octets MicIn(const Octets& response) {
   return {mic.begin(), mic.end()};
 }
 
-Octets WriteResponse(NegState state, const Octets& mic) {
-  Octets fields =
-      Wrapped(Field(0), Wrapped(kEnumerated, Octets{static_cast<unsigned char>(state)}));
-  if (!mic.empty()) {
-    const Octets signature = Wrapped(Field(3), Wrapped(kOctetString, mic));
-    fields.insert(fields.end(), signature.begin(), signature.end());
-  }
-  return Wrapped(Field(1), Wrapped(kSequence, fields));
+Octets WriteResponse(NegState state) {
+  return Response(StateField(state));
 }
 
 }  // namespace DevSts

@@ -16,23 +16,21 @@ class SpnegoError : public std::runtime_error {
 };
 
 enum class NegState : unsigned char {
-  AcceptCompleted = 0,
   AcceptIncomplete = 1,
-  RequestMic = 3,
 };
 
 // The list of mechanisms in a client's first leg, encoded as it stands there: what a mechListMIC
 // signs. Throws SpnegoError.
 Octets MechTypesIn(const Octets& firstLeg);
 
-// A NegTokenResp that has a state, with this one. Throws SpnegoError.
-Octets WithState(Octets response, NegState state);
+// The NegTokenResp, which has a state, with this one and with a mechListMIC. Throws SpnegoError.
+Octets WithMic(const Octets& response, NegState state, const Octets& mic);
 
 // The mechListMIC of a NegTokenResp, empty if there is none. Throws SpnegoError.
 Octets MicIn(const Octets& response);
 
-// A NegTokenResp with a mechListMIC unless that is empty.
-Octets WriteResponse(NegState state, const Octets& mic = {});
+// A NegTokenResp with a state alone.
+Octets WriteResponse(NegState state);
 
 }  // namespace DevSts
 

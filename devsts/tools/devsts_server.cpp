@@ -5,15 +5,19 @@
 #include <unistd.h>
 
 #include <array>
+#include <chrono>
 #include <csignal>
+#include <cstdlib>
 #include <exception>
 #include <filesystem>
 #include <iostream>
+#include <memory>
 #include <mutex>
 #include <optional>
 #include <string>
 #include <string_view>
 
+#include "devsts/kerberos_realm.h"
 #include "devsts/server.h"
 #include "program.h"
 
@@ -22,11 +26,16 @@ namespace {
 constexpr std::string_view kUsage =
     "usage: devsts_server [--http-port N] [--https-port N] [--address ADDRESS] [--out DIR]\n"
     "                     [--vendor-host HOST] [--solution-host HOST] [--end-with-stdin]\n"
-    "                     [--no-resumption]\n"
+    "                     [--no-resumption] [--keytab FILE | --realm] [--principal NAME=USER]\n"
+    "                     [--request-mic]\n"
     "Port 0 takes a free one. DIR receives ca.pem and signing.pem, and client.pem and\n"
     "client-key.pem, by which machine@EXAMPLE.COM may ask for tokens.\n"
     "With --end-with-stdin, each line of standard input is a command: revoke ID.\n"
-    "With --no-resumption, TLS sessions are not resumed.\n";
+    "With --no-resumption, TLS sessions are not resumed.\n"
+    "With --keytab, users log in by Kerberos at a service whose key FILE has. --realm starts a\n"
+    "realm for that, in which alice has a ticket. --principal, which may be repeated, names the\n"
+    "user of a Kerberos principal if it is not the one of the same name. With --request-mic, a\n"
+    "login takes two legs.\n";
 
 constexpr char kClientUser[] = "machine@EXAMPLE.COM";
 
@@ -34,6 +43,8 @@ struct Arguments {
   DevSts::ServerOptions options;
   std::optional<std::string> folder;
   bool endWithStdin = false;
+  bool startsRealm = false;
+  bool requestMic = false;
 };
 
 std::uint16_t PortFrom(const std::string& text) {
@@ -43,6 +54,14 @@ std::uint16_t PortFrom(const std::string& text) {
     throw std::invalid_argument("not a port: " + text);
   }
   return static_cast<std::uint16_t>(port);
+}
+
+void MapPrincipal(const std::string& text, DevSts::NegotiationOptions& options) {
+  const std::size_t sign = text.find('=');
+  if (sign == std::string::npos) {
+    throw std::invalid_argument("not NAME=USER: " + text);
+  }
+  options.principals[text.substr(0, sign)] = text.substr(sign + 1);
 }
 
 void Take(const std::string& name, const std::string& value, Arguments& arguments) {
@@ -57,6 +76,10 @@ void Take(const std::string& name, const std::string& value, Arguments& argument
     options.vendorHost = value;
   } else if (name == "--solution-host") {
     options.solutionHost = value;
+  } else if (name == "--keytab") {
+    options.negotiation.keytab = value;
+  } else if (name == "--principal") {
+    MapPrincipal(value, options.negotiation);
   } else if (name == "--out") {
     arguments.folder = value;
   } else {
@@ -64,22 +87,36 @@ void Take(const std::string& name, const std::string& value, Arguments& argument
   }
 }
 
+// False if there is no such flag.
+bool TakeFlag(const std::string& name, Arguments& arguments) {
+  if (name == "--end-with-stdin") {
+    arguments.endWithStdin = true;
+  } else if (name == "--no-resumption") {
+    arguments.options.tls.sessionResumption = false;
+  } else if (name == "--realm") {
+    arguments.startsRealm = true;
+  } else if (name == "--request-mic") {
+    arguments.requestMic = true;
+  } else {
+    return false;
+  }
+  return true;
+}
+
 Arguments Parse(int argc, char** argv) {
   Arguments arguments;
   for (int i = 1; i < argc; ++i) {
     const std::string name = argv[i];
-    if (name == "--end-with-stdin") {
-      arguments.endWithStdin = true;
-      continue;
-    }
-    if (name == "--no-resumption") {
-      arguments.options.tls.sessionResumption = false;
+    if (TakeFlag(name, arguments)) {
       continue;
     }
     if (++i == argc) {
       throw std::invalid_argument("no value for " + name);
     }
     Take(name, argv[i], arguments);
+  }
+  if (arguments.startsRealm && !arguments.options.negotiation.keytab.empty()) {
+    throw std::invalid_argument("--keytab and --realm exclude each other");
   }
   return arguments;
 }
@@ -95,6 +132,9 @@ void PrintRequest(const DevSts::ReceivedRequest& request) {
   std::cout << "request connection=" << request.connectionId << " tls=" << request.overTls
             << " resumed=" << request.tlsSessionReused << " action=" << request.Header("SOAPAction")
             << " signature=" << kSignatures.at(signature) << " status=" << request.answeredStatus;
+  if (request.leg) {
+    std::cout << " leg=" << request.leg->ordinal;
+  }
   if (!request.answeredFault.empty()) {
     std::cout << " fault=" << request.answeredFault;
   }
@@ -164,17 +204,43 @@ void WriteFiles(const std::string& folder, DevSts::Server& server) {
   DevSts::WriteSecretFile(folder + "/client-key.pem", client.privateKeyPem);
 }
 
+// A realm in which alice has logged in and the service has its key, and what a client of the
+// service must know of it.
+struct StartedRealm {
+  DevSts::KerberosRealm realm;
+  std::string cache;
+};
+
+// Called while this is the only thread: it changes the environment.
+std::unique_ptr<StartedRealm> StartRealm(DevSts::ServerOptions& options) {
+  auto started = std::make_unique<StartedRealm>();
+  options.negotiation.keytab = started->realm.AddKeytab("HTTP/localhost");
+  started->realm.AddUser("alice", "secret");
+  started->cache = started->realm.Login("alice", "secret", std::chrono::hours(8));
+  setenv("KRB5_CONFIG", started->realm.ConfigPath().c_str(), 1);
+  return started;
+}
+
 void Run(Arguments arguments) {
   const sigset_t signals = EndSignals();
   pthread_sigmask(SIG_BLOCK, &signals, nullptr);
   const int signalDescriptor = signalfd(-1, &signals, SFD_CLOEXEC);
 
+  std::unique_ptr<StartedRealm> realm;
+  if (arguments.startsRealm) {
+    realm = StartRealm(arguments.options);
+  }
   arguments.options.onRequest = PrintRequest;
   DevSts::Server server(std::move(arguments.options));
+  server.SetNegotiationScript({.requestMic = arguments.requestMic});
   if (arguments.folder) {
     WriteFiles(*arguments.folder, server);
   }
   std::cout << "http_url=" << server.HttpUrl() << "\nhttps_url=" << server.HttpsUrl() << std::endl;
+  if (realm != nullptr) {
+    std::cout << "krb5_config=" << realm->realm.ConfigPath() << "\nkrb5_cache=" << realm->cache
+              << "\nservice=HTTP@localhost" << std::endl;
+  }
   WaitForEnd(signalDescriptor, arguments.endWithStdin, server);
   close(signalDescriptor);
 }

@@ -65,11 +65,11 @@ struct Drip {
 struct LegMisbehavior {
   /// Answers with this Context, empty as well. If the negotiation goes on, it does so by this
   /// Context alone; with an empty one, it does not.
-  std::optional<std::string> context;
+  std::optional<std::string> context = {};
   /// Writes no Context at all.
   bool omitContext = false;
   /// Answers with these octets in BinaryExchange, none as well.
-  std::optional<std::string> leg;
+  std::optional<std::string> leg = {};
   /// Writes no BinaryExchange.
   bool omitLeg = false;
   /// Sets no cookie, and yet demands it.

@@ -28,9 +28,9 @@ struct NegotiationOptions {
 
 /// How the negotiations go that begin from now on.
 struct NegotiationScript {
-  /// Asks for the signature of the list of mechanisms (RFC 4178, section 5, "request-mic"), and
-  /// gives its own: a login that Kerberos ends with one leg takes a second one. One that takes
-  /// several anyway stays as it is.
+  /// Signs the list of mechanisms and demands that the client does so, too (mechListMIC: RFC 4178,
+  /// section 5), as a service does that would have preferred another mechanism: a login that
+  /// Kerberos ends with one leg takes a second one. One that takes several anyway stays as it is.
   bool requestMic = false;
   /// So many more legs are asked for when the login is done already. What the client sends in them
   /// is not looked at; the service's own say "accept-incomplete" and nothing else.
