@@ -6,6 +6,7 @@
 #include <string>
 
 #include "sts/answers.h"
+#include "sts/token_specs.h"
 #include "support/fake_saml_token.h"
 #include "transport/connection_specs.h"
 #include "transport/fake_http.h"
@@ -16,6 +17,8 @@ namespace SsoClient {
 namespace {
 
 using testing::HasSubstr;
+using Testing::IssueAnswer;
+using Testing::OneHour;
 using testing::StartsWith;
 
 class AcceptingFactory final : public SamlTokenFactory {
@@ -33,17 +36,6 @@ class AcceptingFactory final : public SamlTokenFactory {
     return nullptr;
   }
 };
-
-std::string IssueAnswer() {
-  return Testing::Envelope(
-      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
-}
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
-}
 
 template <class Config>
 std::string ArgumentError(const Config& config) {

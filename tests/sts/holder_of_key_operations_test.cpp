@@ -15,6 +15,7 @@
 #include "sts/request_builder_impl.h"
 #include "sts/response_handler_impl.h"
 #include "sts/security_token_service_impl.h"
+#include "sts/token_specs.h"
 #include "support/holder_of_key.h"
 #include "support/vtable_slot.h"
 
@@ -24,27 +25,15 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using Testing::IssueAnswer;
 using testing::Not;
-
-std::string IssueAnswer() {
-  return Testing::Envelope(
-      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
-}
-
-std::string RenewAnswer() {
-  return Testing::Envelope(Testing::Rstr(Testing::Requested(Testing::kAssertionXml)));
-}
+using Testing::OneHour;
+using Testing::RenewAnswer;
 
 std::string StatusAnswer(const std::string& code) {
   return Testing::Envelope(Testing::Rstr(
       "<wst:Status><wst:Code>http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/" + code +
       "</wst:Code></wst:Status>"));
-}
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
 }
 
 Testing::FakeSamlToken Presented() {

@@ -12,6 +12,7 @@
 #include "sts/request_builder_impl.h"
 #include "sts/response_handler_impl.h"
 #include "sts/security_token_service_impl.h"
+#include "sts/token_specs.h"
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 
@@ -21,7 +22,10 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using Testing::LastLegAnswer;
+using Testing::LegAnswer;
 using testing::Not;
+using Testing::OneHour;
 using TestSupport::ThrownMessage;
 
 using Leg = std::vector<unsigned char>;
@@ -29,26 +33,6 @@ using LegHandle = std::shared_ptr<const Leg>;
 
 constexpr char kContractError[] =
     "4 GSS contract error: non-empty user leg after negotiation is complete";
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
-}
-
-// "AQID" is 1, 2, 3.
-constexpr char kServerLeg[] = "<wst:BinaryExchange>AQID</wst:BinaryExchange>";
-
-std::string LegAnswer(const std::string& context) {
-  return Testing::Envelope(Testing::Rstr(kServerLeg, " Context=\"" + context + "\""));
-}
-
-std::string FinalAnswer(const std::string& leg = {}, const std::string& context = "c") {
-  return Testing::Envelope(Testing::Collection(
-      Testing::Rstr(leg + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
-                        Testing::Requested(Testing::kAssertionXml),
-                    " Context=\"" + context + "\"")));
-}
 
 // Answers each call with the next leg, and records what it was given.
 class ScriptedHandler final : public NegotiationHandler {
@@ -90,7 +74,7 @@ class Sts {
 };
 
 TEST(NegotiatedLoginTest, ATokenOnTheFirstLegEndsTheLoopAfterOneExchange) {
-  const Sts sts({FinalAnswer()});
+  const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({7})});
   const auto token = sts.Service()->AcquireTokenByGSS(OneHour(), handler);
   ASSERT_NE(token, nullptr);
@@ -103,7 +87,7 @@ TEST(NegotiatedLoginTest, ATokenOnTheFirstLegEndsTheLoopAfterOneExchange) {
 }
 
 TEST(NegotiatedLoginTest, LaterLegsContinueTheNegotiationInOneSession) {
-  const Sts sts({LegAnswer("first"), LegAnswer("second"), FinalAnswer()});
+  const Sts sts({LegAnswer("first"), LegAnswer("second"), LastLegAnswer()});
   ScriptedHandler handler({LegOf({1}), LegOf({2}), LegOf({})});
   EXPECT_NE(sts.Service()->AcquireTokenByGSS(OneHour(), handler), nullptr);
   EXPECT_EQ(sts.transport->sessions, 1);
@@ -121,7 +105,7 @@ TEST(NegotiatedLoginTest, LaterLegsContinueTheNegotiationInOneSession) {
 }
 
 TEST(NegotiatedLoginTest, TheOperationIsTraced) {
-  const Sts sts({FinalAnswer()});
+  const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({7})});
   const Testing::LogCapture log(7);
   const auto token = sts.Service()->AcquireTokenByGSS(OneHour(), handler);
@@ -141,7 +125,7 @@ struct LastLegCase {
 class LastLegTest : public testing::TestWithParam<LastLegCase> {};
 
 TEST_P(LastLegTest, IsHandedToTheHandlerWhoseAnswerIsNotSent) {
-  const Sts sts({FinalAnswer(kServerLeg)});
+  const Sts sts({LastLegAnswer(Testing::kAssertionXml, Testing::kLeg)});
   ScriptedHandler handler({LegOf({7}), GetParam().afterTheLast});
   const Testing::LogCapture log(4);
   EXPECT_NE(sts.Service()->AcquireTokenByGSS(OneHour(), handler), nullptr);
@@ -161,7 +145,7 @@ INSTANTIATE_TEST_SUITE_P(Answers, LastLegTest,
                          [](const auto& tested) { return tested.param.name; });
 
 TEST(NegotiatedLoginTest, ANullLegFailsBeforeAnythingIsSent) {
-  const Sts sts({FinalAnswer()});
+  const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({nullptr});
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
                 [&] { sts.Service()->AcquireTokenByGSS(OneHour(), handler); }),
@@ -179,7 +163,7 @@ TEST(NegotiatedLoginTest, ANullLegLaterEndsTheLogin) {
 }
 
 TEST(NegotiatedLoginTest, AnAnswerWithoutAContextIsRefusedEvenWithAToken) {
-  for (const auto& answer : {LegAnswer(""), FinalAnswer("", "")}) {
+  for (const auto& answer : {LegAnswer(""), LastLegAnswer(Testing::kAssertionXml, "", "")}) {
     const Sts sts({answer});
     ScriptedHandler handler({LegOf({1})});
     EXPECT_EQ(ThrownMessage<CommunicationException>(
@@ -190,7 +174,7 @@ TEST(NegotiatedLoginTest, AnAnswerWithoutAContextIsRefusedEvenWithAToken) {
 }
 
 TEST(NegotiatedLoginTest, TheLifetimeIsJudgedBeforeAnythingIsSent) {
-  const Sts sts({FinalAnswer()});
+  const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({1})});
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
                 [&] { sts.Service()->AcquireTokenByGSS(TokenSpec(), handler); }),
@@ -215,7 +199,9 @@ TEST(NegotiatedLoginTest, WhatTheHandlerThrowsPassesUnchanged) {
   EXPECT_THROW(Sts({LegAnswer("c")}).Service()->AcquireTokenByGSS(OneHour(), handler),
                HandlersOwnFailure);
   const Testing::LogCapture log(7);
-  EXPECT_THROW(Sts({FinalAnswer(kServerLeg)}).Service()->AcquireTokenByGSS(OneHour(), handler),
+  EXPECT_THROW(Sts({LastLegAnswer(Testing::kAssertionXml, Testing::kLeg)})
+                   .Service()
+                   ->AcquireTokenByGSS(OneHour(), handler),
                HandlersOwnFailure);
   EXPECT_EQ(log.Lines().back(), "7 END operation SecurityTokenServiceImpl::AcquireTokenByGSS");
 }
@@ -223,22 +209,23 @@ TEST(NegotiatedLoginTest, WhatTheHandlerThrowsPassesUnchanged) {
 TEST(NegotiatedLoginAsyncTest, TheTwinReportsTokenAndErrors) {
   ScriptedHandler handler({LegOf({1})});
   Testing::AsyncCall call;
-  Sts({FinalAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
+  Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
   EXPECT_NE(call.Wait().token, nullptr);
   ScriptedHandler nullHandler({nullptr});
   Testing::AsyncCall failing;
-  Sts({FinalAnswer()})
+  Sts({LastLegAnswer()})
       .Service()
       ->AcquireTokenByGSSAsync(OneHour(), nullHandler, failing.Callback());
   EXPECT_EQ(failing.Wait().errorType, typeid(Tarnik::InvalidArgumentException).name());
-  EXPECT_THROW(Sts({FinalAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, nullptr),
-               Tarnik::InvalidArgumentException);
+  EXPECT_THROW(
+      Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, nullptr),
+      Tarnik::InvalidArgumentException);
 }
 
 TEST(NegotiatedLoginTest, OperationsStandInTheirOrder) {
   using TestSupport::VtableSlot;
   using Token = std::shared_ptr<const SamlToken>;
-  const auto service = Sts({FinalAnswer()}).Service();
+  const auto service = Sts({LastLegAnswer()}).Service();
   const SecurityTokenService* object = service.get();
   ScriptedHandler handler({LegOf({1})});
   EXPECT_NE((VtableSlot<Token(const void*, const TokenSpec&, NegotiationHandler&)>(object, 1)(

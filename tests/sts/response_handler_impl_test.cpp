@@ -19,8 +19,10 @@ using testing::ElementsAre;
 using Testing::Envelope;
 using Testing::Fault;
 using testing::IsEmpty;
+using Testing::IssueAnswer;
 using Testing::kAssertionXml;
 using Testing::kCanonicalAssertion;
+using Testing::RenewAnswer;
 using Testing::Requested;
 using Testing::Rstr;
 using testing::StartsWith;
@@ -75,12 +77,6 @@ const std::vector<std::pair<std::string, Parser>>& AllParsers() {
   return kParsers;
 }
 
-std::string IssueAnswer() {
-  return Envelope(Collection(Rstr(Requested(kAssertionXml))));
-}
-std::string RenewAnswer() {
-  return Envelope(Rstr(Requested(kAssertionXml)));
-}
 std::string StatusAnswer(const std::string& code) {
   return Envelope(Rstr("<wst:Status><wst:Code>" + code + "</wst:Code></wst:Status>"));
 }

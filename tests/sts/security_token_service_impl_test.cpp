@@ -11,6 +11,7 @@
 #include "sts/log_capture.h"
 #include "sts/request_builder_impl.h"
 #include "sts/response_handler_impl.h"
+#include "sts/token_specs.h"
 #include "support/fake_saml_token.h"
 #include "support/vtable_slot.h"
 
@@ -23,7 +24,9 @@ using Testing::FakeTokenFactory;
 using Testing::FakeTransport;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using Testing::IssueAnswer;
 using testing::Not;
+using Testing::OneHour;
 
 class EmptyResponseHandler final : public ResponseHandler {
  public:
@@ -34,17 +37,6 @@ class EmptyResponseHandler final : public ResponseHandler {
   void ParseRenewResponse(Tarnik::Reader*, std::string&) const override {}
   void ParseNegotiationResponse(Tarnik::Reader*, NegotiationResponse&) const override {}
 };
-
-std::string IssueAnswer() {
-  return Testing::Envelope(
-      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
-}
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
-}
 
 class SecurityTokenServiceImplTest : public testing::Test {
  protected:

@@ -9,6 +9,7 @@
 #include "sts/fakes.h"
 #include "sts/request_builder_impl.h"
 #include "sts/response_handler_impl.h"
+#include "sts/token_specs.h"
 #include "support/assertion_text.h"
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
@@ -19,26 +20,11 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using Testing::LastLegAnswer;
+using Testing::LegAnswer;
 using testing::Not;
+using Testing::OneHour;
 using TestSupport::ThrownMessage;
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
-}
-
-std::string LegAnswer(const std::string& context) {
-  return Testing::Envelope(Testing::Rstr("<wst:BinaryExchange>AQID</wst:BinaryExchange>",
-                                         " Context=\"" + context + "\""));
-}
-
-std::string FinalAnswer(const std::string& assertion) {
-  return Testing::Envelope(Testing::Collection(
-      Testing::Rstr("<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
-                        Testing::Requested(assertion),
-                    " Context=\"c\"")));
-}
 
 class GssNegotiationContextImplTest : public testing::Test {
  protected:
@@ -73,7 +59,7 @@ TEST_F(GssNegotiationContextImplTest, TheFirstLegCarriesTheSpecAndTheSecondTheCo
 }
 
 TEST_F(GssNegotiationContextImplTest, ATokenWithoutALegGivesAnEmptyPresentLeg) {
-  Answer({FinalAnswer(TestSupport::AssertionText().ToXml())});
+  Answer({LastLegAnswer(TestSupport::AssertionText().ToXml())});
   const auto result = context_->Negotiate({7});
   ASSERT_NE(result.outputLeg, nullptr);
   EXPECT_THAT(*result.outputLeg, IsEmpty());
@@ -82,14 +68,14 @@ TEST_F(GssNegotiationContextImplTest, ATokenWithoutALegGivesAnEmptyPresentLeg) {
 
 TEST_F(GssNegotiationContextImplTest, ATokenIsVerifiedWithTheResolver) {
   const auto text = TestSupport::AssertionText();
-  Answer({FinalAnswer(text.ToSignedXml(TestSupport::TrustedCredential()))}, OneHour(),
+  Answer({LastLegAnswer(text.ToSignedXml(TestSupport::TrustedCredential()))}, OneHour(),
          TestSupport::TrustedResolver());
   EXPECT_NE(context_->Negotiate({7}).token, nullptr);
 }
 
 TEST_F(GssNegotiationContextImplTest, ARefusedTokenHasNamedTheNegotiationAllTheSame) {
   const auto text = TestSupport::AssertionText();
-  Answer({FinalAnswer(text.ToSignedXml(TestSupport::StrangerCredential()))}, OneHour(),
+  Answer({LastLegAnswer(text.ToSignedXml(TestSupport::StrangerCredential()))}, OneHour(),
          TestSupport::TrustedResolver());
   EXPECT_THROW(context_->Negotiate({7}), InvalidSignatureException);
   EXPECT_THROW(context_->Negotiate({8}), InvalidSignatureException);
@@ -121,7 +107,7 @@ TEST_F(GssNegotiationContextImplTest, TheSpecIsJudgedWithTheFirstLeg) {
 }
 
 TEST_F(GssNegotiationContextImplTest, ALegAfterTheTokenContinuesWithTheLastContext) {
-  Answer({FinalAnswer(TestSupport::AssertionText().ToXml())});
+  Answer({LastLegAnswer(TestSupport::AssertionText().ToXml())});
   context_->Negotiate({7});
   context_->Negotiate({8});
   EXPECT_THAT(transport_->bodies[1], HasSubstr("Context=\"c\""));
