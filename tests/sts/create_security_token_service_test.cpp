@@ -7,6 +7,7 @@
 
 #include "sts/answers.h"
 #include "sts/token_specs.h"
+#include "support/assertion_text.h"
 #include "support/fake_saml_token.h"
 #include "transport/connection_specs.h"
 #include "transport/fake_http.h"
@@ -80,6 +81,15 @@ TEST_F(CreateSecurityTokenServiceTest, TheFlagChangesNothing) {
 TEST_F(CreateSecurityTokenServiceTest, ReadsTheConfigurationOnce) {
   const auto service = CreateSecurityTokenService(config_);
   config_ = {};
+  EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
+}
+
+TEST_F(CreateSecurityTokenServiceTest, TheKeyInfoResolverIsNotForTheService) {
+  const auto resolver = TestSupport::TrustedResolver();
+  config_.keyInfoResolver = resolver.get();
+  const auto service = CreateSecurityTokenService(config_);
+  EXPECT_EQ(resolver->RefCount(), 1);
+  // The answered token is signed by nobody.
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
 }
 
