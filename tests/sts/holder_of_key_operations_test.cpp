@@ -89,6 +89,7 @@ TEST(HolderOfKeyOperationsTest, ByTokenIsTraced) {
   const auto presented = Presented();
   const auto token = sts.Service()->AcquireTokenByToken(presented, OneHour());
   ASSERT_NE(token, nullptr);
+  EXPECT_THAT(sts.factory->tolerances, ElementsAre(600));
   EXPECT_THAT(sts.transport->bodies.front(), HasSubstr("<Presented ID=\"_1\"/>"));
   EXPECT_THAT(log.Lines(),
               ElementsAre(Start("AcquireTokenByToken"),

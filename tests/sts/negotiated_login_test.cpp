@@ -2,6 +2,7 @@
 #include <tarnik/core/exception.h>
 
 #include <functional>
+#include <future>
 #include <string>
 #include <vector>
 
@@ -87,17 +88,20 @@ TEST(NegotiatedLoginTest, ATokenOnTheFirstLegEndsTheLoopAfterOneExchange) {
 }
 
 TEST(NegotiatedLoginTest, LaterLegsContinueTheNegotiationInOneSession) {
-  const Sts sts({LegAnswer("first"), LegAnswer("second"), LastLegAnswer()});
+  const Sts sts({LegAnswer("first"),
+                 LegAnswer("second", "<wst:BinaryExchange>BAU=</wst:BinaryExchange>"),
+                 LastLegAnswer()});
   ScriptedHandler handler({LegOf({1}), LegOf({2}), LegOf({})});
   EXPECT_NE(sts.Service()->AcquireTokenByGSS(OneHour(), handler), nullptr);
   EXPECT_EQ(sts.transport->sessions, 1);
-  EXPECT_THAT(handler.received, ElementsAre(Leg{}, Leg({1, 2, 3}), Leg({1, 2, 3})));
+  EXPECT_THAT(handler.received, ElementsAre(Leg{}, Leg({1, 2, 3}), Leg({4, 5})));
   const std::string issue = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
   const std::string next = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RSTR/Issue";
   EXPECT_THAT(sts.transport->actions, ElementsAre(issue, next, next));
   EXPECT_THAT(sts.transport->bodies[0], HasSubstr("<wst:RequestSecurityToken "));
   EXPECT_THAT(sts.transport->bodies[1],
               HasSubstr("<wst:RequestSecurityTokenResponse Context=\"first\">"));
+  EXPECT_THAT(sts.transport->bodies[1], HasSubstr(">Ag==</wst:BinaryExchange>"));
   // The context is the one of the last answer.
   EXPECT_THAT(sts.transport->bodies[2],
               HasSubstr("<wst:RequestSecurityTokenResponse Context=\"second\">"));
@@ -144,6 +148,18 @@ INSTANTIATE_TEST_SUITE_P(Answers, LastLegTest,
                                          LastLegCase{"Bytes", LegOf({9}), false}),
                          [](const auto& tested) { return tested.param.name; });
 
+TEST(NegotiatedLoginTest, TheLastLegIsHandedOverBeforeTheTokenIsMade) {
+  const Sts sts({LastLegAnswer(Testing::kAssertionXml, Testing::kLeg)});
+  sts.factory->isRefusing = true;
+  ScriptedHandler handler({LegOf({7}), nullptr});
+  const Testing::LogCapture log(5);
+  EXPECT_EQ(ThrownMessage<InvalidSignatureException>(
+                [&] { sts.Service()->AcquireTokenByGSS(OneHour(), handler); }),
+            "refused");
+  EXPECT_THAT(handler.received, ElementsAre(Leg{}, Leg({1, 2, 3})));
+  EXPECT_THAT(log.Lines(), ElementsAre(kContractError));
+}
+
 TEST(NegotiatedLoginTest, ANullLegFailsBeforeAnythingIsSent) {
   const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({nullptr});
@@ -176,10 +192,18 @@ TEST(NegotiatedLoginTest, AnAnswerWithoutAContextIsRefusedEvenWithAToken) {
 TEST(NegotiatedLoginTest, TheLifetimeIsJudgedBeforeAnythingIsSent) {
   const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({1})});
+  const Testing::LogCapture log(7);
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
                 [&] { sts.Service()->AcquireTokenByGSS(TokenSpec(), handler); }),
             "Token lifetime must be positive");
   EXPECT_THAT(sts.transport->bodies, IsEmpty());
+  // The session and the leg come first.
+  EXPECT_EQ(sts.transport->sessions, 1);
+  EXPECT_THAT(handler.received, ElementsAre(Leg{}));
+  EXPECT_THAT(log.Lines(),
+              ElementsAre("7 START operation SecurityTokenServiceImpl::AcquireTokenByGSS",
+                          "7 Requested token with spec `" + Describe(TokenSpec()) + "'",
+                          "7 END operation SecurityTokenServiceImpl::AcquireTokenByGSS"));
 }
 
 struct HandlersOwnFailure {};
@@ -220,6 +244,31 @@ TEST(NegotiatedLoginAsyncTest, TheTwinReportsTokenAndErrors) {
   EXPECT_THROW(
       Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, nullptr),
       Tarnik::InvalidArgumentException);
+}
+
+// Waits within its first leg.
+class WaitingHandler final : public NegotiationHandler {
+ public:
+  LegHandle Negotiate(const Leg&) override {
+    isGoingOn.get_future().wait();
+    return LegOf({1});
+  }
+
+  std::promise<void> isGoingOn;
+};
+
+TEST(NegotiatedLoginAsyncTest, ACallReturnsAtOnceAndWorksWithACopyOfTheService) {
+  const Sts sts({LastLegAnswer()});
+  auto service = sts.Service();
+  const std::weak_ptr<const SecurityTokenService> original = service;
+  WaitingHandler handler;
+  Testing::AsyncCall call;
+  service->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
+  service = nullptr;
+  EXPECT_TRUE(original.expired());
+  handler.isGoingOn.set_value();
+  EXPECT_NE(call.Wait().token, nullptr);
+  EXPECT_EQ(sts.transport->bodies.size(), 1U);
 }
 
 TEST(NegotiatedLoginTest, OperationsStandInTheirOrder) {
