@@ -1,3 +1,4 @@
+#include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 #include <ssoclient/security_token_service.h>
 #include <tarnik/http/http_user_agent.h>
@@ -9,6 +10,8 @@
 #include "sts/token_specs.h"
 #include "support/assertion_text.h"
 #include "support/fake_saml_token.h"
+#include "support/holder_of_key.h"
+#include "support/thrown_message.h"
 #include "transport/connection_specs.h"
 #include "transport/fake_http.h"
 #include "transport/fake_ssl.h"
@@ -48,6 +51,14 @@ std::string ArgumentError(const Config& config) {
   return "none";
 }
 
+constexpr char kNoKey[] = "No HolderOfKeyConfig provided. Unable to acquire token by certificate";
+
+template <class Config>
+std::string ByCertificateWithoutAKey(const Config& config) {
+  return TestSupport::ThrownMessage<Tarnik::InvalidStateException>(
+      [&] { CreateSecurityTokenService(config)->AcquireTokenByCertificate(OneHour()); });
+}
+
 class CreateSecurityTokenServiceTest : public testing::Test {
  protected:
   CreateSecurityTokenServiceTest() {
@@ -82,6 +93,17 @@ TEST_F(CreateSecurityTokenServiceTest, ReadsTheConfigurationOnce) {
   const auto service = CreateSecurityTokenService(config_);
   config_ = {};
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
+}
+
+TEST_F(CreateSecurityTokenServiceTest, SignsWithTheConfiguredKeyOrNotAtAll) {
+  const auto credential = Testing::KeyCredential();
+  EXPECT_EQ(ByCertificateWithoutAKey(config_), kNoKey);
+  config_.holderOfKeyConfig = Testing::ConfigOf(credential);
+  CreateSecurityTokenService(config_)->AcquireTokenByCertificate(OneHour());
+  const auto request = server_.Requests().at(0);
+  const auto verdict =
+      DevSts::VerifyXml(request.substr(request.find("\r\n\r\n") + 4), credential.certificatePem);
+  EXPECT_TRUE(verdict.valid) << verdict.reason;
 }
 
 TEST_F(CreateSecurityTokenServiceTest, TheKeyInfoResolverIsNotForTheService) {
@@ -138,6 +160,12 @@ TEST_F(CreateSecurityTokenServiceExTest, SendsThroughTheCallersAgentFor240Second
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
   EXPECT_THAT(agent_->waitTimeouts, testing::ElementsAre(240'000'000UL, 240'000'000UL));
+}
+
+TEST_F(CreateSecurityTokenServiceExTest, SignsWithTheConfiguredKeyOrNotAtAll) {
+  EXPECT_EQ(ByCertificateWithoutAKey(configEx_), kNoKey);
+  configEx_.holderOfKeyConfig = Testing::ConfigOf(Testing::KeyCredential());
+  EXPECT_NE(CreateSecurityTokenService(configEx_)->AcquireTokenByCertificate(OneHour()), nullptr);
 }
 
 TEST_F(CreateSecurityTokenServiceExTest, UsesTheUrlAsTheRequestTarget) {
