@@ -173,6 +173,31 @@ TEST(HolderOfKeyOperationsAsyncTest, TwinsGiveTokens) {
   }
 }
 
+TEST(HolderOfKeyOperationsAsyncTest, TwinsAskForTheSame) {
+  const Sts sts(IssueAnswer());
+  const auto service = sts.Service();
+  const auto presented = Presented();
+  auto spec = OneHour();
+  spec.audienceRestriction = {"urn:audience"};
+  const auto requestLine = [](const auto& start) {
+    const Testing::LogCapture log(7);
+    Testing::AsyncCall call;
+    start(call.Callback());
+    call.Wait();
+    return log.Lines().at(1);
+  };
+  EXPECT_EQ(requestLine([&](auto done) { service->AcquireTokenAsync("bob", "pw", spec, done); }),
+            "7 Requested token for subject `bob', spec `" + Describe(spec) + "'");
+  EXPECT_EQ(requestLine([&](auto done) { service->AcquireTokenByCertificateAsync(spec, done); }),
+            "7 Requested token with spec `" + Describe(spec) + "'");
+  EXPECT_EQ(
+      requestLine([&](auto done) { service->AcquireTokenByTokenAsync(presented, spec, done); }),
+      "7 Requested token for " + CreateSamlTokenDescription(presented) + " with spec `" +
+          Describe(spec) + "'");
+  EXPECT_EQ(requestLine([&](auto done) { service->RenewTokenAsync(presented, 77, done); }),
+            "7 Renewing token " + CreateSamlTokenDescription(presented) + " for 77 more seconds");
+}
+
 TEST(HolderOfKeyOperationsAsyncTest, ThreadsMaySignWithOneServiceThatIsReleasedMeanwhile) {
   constexpr int kThreads = 4;
   constexpr int kRounds = 8;

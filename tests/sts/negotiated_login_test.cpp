@@ -233,8 +233,12 @@ TEST(NegotiatedLoginTest, WhatTheHandlerThrowsPassesUnchanged) {
 TEST(NegotiatedLoginAsyncTest, TheTwinReportsTokenAndErrors) {
   ScriptedHandler handler({LegOf({1})});
   Testing::AsyncCall call;
-  Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
+  auto spec = OneHour();
+  spec.audienceRestriction = {"urn:audience"};
+  const Testing::LogCapture log(7);
+  Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(spec, handler, call.Callback());
   EXPECT_NE(call.Wait().token, nullptr);
+  EXPECT_EQ(log.Lines().at(1), "7 Requested token with spec `" + Describe(spec) + "'");
   ScriptedHandler nullHandler({nullptr});
   Testing::AsyncCall failing;
   Sts({LastLegAnswer()})
