@@ -271,6 +271,21 @@ TEST_F(ExchangeTest, HoldsItsTimeLimitAgainstAByteNowAndThen) {
   dribble.join();
 }
 
+// The exchange may be over before the start of its connect returns, and the connection may serve
+// the next one.
+TEST_F(ExchangeTest, CancelsNoConnectThatHasEnded) {
+  const auto heard = std::make_shared<Heard>();
+  ScriptedSpec::Script script;
+  script.stream.onWritten = AnswerWith(kHello);
+  script.beforeStartReturns = [heard] {
+    EXPECT_TRUE(Eventually([&] { return heard->count == 1; }));
+  };
+  Use(script);
+  Send(heard);
+  EXPECT_EQ(heard->body, "hello");
+  EXPECT_EQ(spec_->CancelCount(), 0U);
+}
+
 TEST_F(ExchangeTest, ClosesAStreamThatIsConnectedAfterTheEnd) {
   ScriptedSpec::Script script;
   script.holdConnects = true;
