@@ -104,7 +104,7 @@ void RequestBuilderImpl::BuildAcquireTokenRequest(const std::string& userName,
                                                   SoapRequest& request) const {
   CheckLifetime(spec.tokenLifetimeSec);
   const auto header = BuildHeader(BuildUsernamePasswordToken(userName, password));
-  const auto body = BuildIssueBodyWithUseKey(AsksForHolderOfKey(spec) ? 1 : 0, spec);
+  const auto body = BuildIssueBodyWithUseKey(KeyTypeFor(spec), spec);
   Assign(kIssueAction, Enclose(spec, header, body), request);
 }
 
@@ -112,8 +112,7 @@ void RequestBuilderImpl::BuildInitialNegotiationRequest(const TokenSpec& spec,
                                                         const std::vector<unsigned char>& leg,
                                                         SoapRequest& request) const {
   CheckLifetime(spec.tokenLifetimeSec);
-  const auto body =
-      std::make_shared<XMLBodyBuilderInitialSPNego>(AsksForHolderOfKey(spec) ? 1 : 0, spec, leg);
+  const auto body = std::make_shared<XMLBodyBuilderInitialSPNego>(KeyTypeFor(spec), spec, leg);
   Assign(kIssueAction, Enclose(spec, BuildHeader(), body), request);
 }
 
@@ -129,7 +128,7 @@ void RequestBuilderImpl::BuildAcquireTokenByCertificateRequest(const TokenSpec& 
   CheckLifetime(spec.tokenLifetimeSec);
   const HolderOfKeyConfig& config = RequireHolderOfKey(kByCertificate);
   CheckDefaultConfirmation(spec, kByCertificate);
-  const auto body = BuildIssueBodyWithUseKey(AsksForHolderOfKey(spec) ? 1 : 0, spec);
+  const auto body = BuildIssueBodyWithUseKey(KeyTypeFor(spec), spec);
   Assign(kIssueAction, SignByCertificate(config, BuildHeader(), body), request);
 }
 
@@ -139,7 +138,7 @@ void RequestBuilderImpl::BuildAcquireTokenByTokenRequest(const SamlToken& token,
   CheckLifetime(spec.tokenLifetimeSec);
   const HolderOfKeyConfig& config = RequireHolderOfKey(kByToken);
   const auto header = BuildHeader(MakeTokenElementBuilder(token));
-  const auto body = BuildIssueBody(AsksForHolderOfKey(spec) ? 1 : 0, spec);
+  const auto body = BuildIssueBody(KeyTypeFor(spec), spec);
   Assign(kIssueAction, SignByToken(config, header, body, token), request);
 }
 
@@ -166,6 +165,10 @@ const HolderOfKeyConfig& RequestBuilderImpl::RequireHolderOfKey(
 
 bool RequestBuilderImpl::AsksForHolderOfKey(const TokenSpec& spec) const {
   return holderOfKeyConfig_ && spec.confirmation == CONFIRMATION_DEFAULT;
+}
+
+unsigned RequestBuilderImpl::KeyTypeFor(const TokenSpec& spec) const {
+  return AsksForHolderOfKey(spec) ? 1 : 0;
 }
 
 // A request on behalf of another's token is not signed, even when it asks for a holder-of-key

@@ -37,6 +37,8 @@ class RequestBuilderImpl final : public RequestBuilder {
  private:
   const HolderOfKeyConfig& RequireHolderOfKey(const std::string& operation) const;
   bool AsksForHolderOfKey(const TokenSpec& spec) const;
+  /// The key type that the body of a request asks for, as `BuildIssueBody` takes it.
+  unsigned KeyTypeFor(const TokenSpec& spec) const;
   /// The envelope of a request that proves who asks by other means than the key: signed when the
   /// token is to be bound to the key.
   std::shared_ptr<XMLBaseBuilder> Enclose(const TokenSpec& spec,

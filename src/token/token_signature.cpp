@@ -14,8 +14,6 @@ namespace {
 
 using Tarnik::Ref;
 using Tarnik::Xml::ElementNode;
-using Tarnik::Xml::Node;
-using Tarnik::Xml::NodeKind;
 using Tarnik::Xml::Security::KeyInfoResolver;
 using Tarnik::Xml::Security::Reference;
 using Tarnik::Xml::Security::Signature;
@@ -34,29 +32,12 @@ bool Covers(std::string_view uri, std::string_view assertionId) {
   return uri.empty() || (uri.front() == '#' && uri.substr(1) == assertionId);
 }
 
-// The next element of the subtree of `top` in document order, or null.
-const ElementNode* NextElement(const ElementNode* element, const ElementNode* top) {
-  const Node* next = element->FirstChild();
-  for (;;) {
-    for (; next != nullptr; next = next->NextSibling()) {
-      if (next->Kind() == NodeKind::kElement) {
-        return static_cast<const ElementNode*>(next);
-      }
-    }
-    if (element == top) {
-      return nullptr;
-    }
-    next = element->NextSibling();
-    element = element->ParentElement();
-  }
-}
-
 // What KeyInfo holds is not signed, and the token's text is handed on with it: there an assertion
 // would wait for a reader that looks for one anywhere.
 bool HoldsSamlElement(const ElementNode* keyInfo) {
   const ElementNode* element = keyInfo;
   while (element != nullptr && element->NamespaceUri() != kSamlNamespace) {
-    element = NextElement(element, keyInfo);
+    element = element->NextElement(keyInfo);
   }
   return element != nullptr;
 }

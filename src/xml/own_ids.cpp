@@ -13,8 +13,6 @@ namespace SsoClient {
 namespace {
 
 using Tarnik::Xml::ElementNode;
-using Tarnik::Xml::Node;
-using Tarnik::Xml::NodeKind;
 
 // Whatever its namespace: services differ in what they take for an id.
 bool MayBeTakenForId(std::string_view localName) {
@@ -31,19 +29,6 @@ bool Carries(const ElementNode& element, std::string_view id) {
   return false;
 }
 
-// Without recursion: tokens may be deep.
-const Node* NextInDocument(const Node* node) {
-  if (node->Kind() == NodeKind::kElement) {
-    if (const Node* child = static_cast<const ElementNode*>(node)->FirstChild()) {
-      return child;
-    }
-  }
-  while (node != nullptr && node->NextSibling() == nullptr) {
-    node = node->Parent();
-  }
-  return node == nullptr ? nullptr : node->NextSibling();
-}
-
 [[noreturn]] void Refuse(const char* id) {
   throw Tarnik::InvalidArgumentException(std::string("A token in the request carries the id '") +
                                          id + "', which is the request's own");
@@ -53,15 +38,12 @@ const Node* NextInDocument(const Node* node) {
 
 void RequireOwnIds(const ElementNode& envelope) {
   int certificates = 0;
-  for (const Node* node = &envelope; node != nullptr; node = NextInDocument(node)) {
-    if (node->Kind() != NodeKind::kElement) {
-      continue;
-    }
-    const auto& element = static_cast<const ElementNode&>(*node);
-    if (Carries(element, kProofSignatureId)) {
+  for (const ElementNode* element = &envelope; element != nullptr;
+       element = element->NextElement(&envelope)) {
+    if (Carries(*element, kProofSignatureId)) {
       Refuse(kProofSignatureId);
     }
-    if (Carries(element, kCertificateId) && ++certificates > 1) {
+    if (Carries(*element, kCertificateId) && ++certificates > 1) {
       Refuse(kCertificateId);
     }
   }

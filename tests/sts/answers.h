@@ -40,6 +40,31 @@ inline std::string Fault(const std::string& code, const std::string& text) {
   return Fault("<faultcode>" + code + "</faultcode><faultstring>" + text + "</faultstring>");
 }
 
+inline std::string IssueAnswer() {
+  return Envelope(Collection(Rstr(Requested(kAssertionXml))));
+}
+
+inline std::string RenewAnswer() {
+  return Envelope(Rstr(Requested(kAssertionXml)));
+}
+
+/// A leg of the bytes 1, 2 and 3.
+inline constexpr char kLeg[] = "<wst:BinaryExchange>AQID</wst:BinaryExchange>";
+
+/// The answer to a leg that is not the last.
+inline std::string LegAnswer(const std::string& context, const std::string& leg = kLeg) {
+  return Envelope(Rstr(leg, " Context=\"" + context + "\""));
+}
+
+/// The answer that ends a negotiation with a token.
+inline std::string LastLegAnswer(const std::string& assertion = kAssertionXml,
+                                 const std::string& leg = {}, const std::string& context = "c") {
+  return Envelope(
+      Collection(Rstr(leg + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
+                          Requested(assertion),
+                      " Context=\"" + context + "\"")));
+}
+
 /// What the canonical text of `kAssertionXml` is inside of `Envelope`: it keeps the declarations
 /// that it inherits.
 inline constexpr char kCanonicalAssertion[] =

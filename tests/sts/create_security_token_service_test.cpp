@@ -1,3 +1,4 @@
+#include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 #include <ssoclient/security_token_service.h>
 #include <tarnik/http/http_user_agent.h>
@@ -6,7 +7,11 @@
 #include <string>
 
 #include "sts/answers.h"
+#include "sts/token_specs.h"
+#include "support/assertion_text.h"
 #include "support/fake_saml_token.h"
+#include "support/holder_of_key.h"
+#include "support/thrown_message.h"
 #include "transport/connection_specs.h"
 #include "transport/fake_http.h"
 #include "transport/fake_ssl.h"
@@ -16,6 +21,8 @@ namespace SsoClient {
 namespace {
 
 using testing::HasSubstr;
+using Testing::IssueAnswer;
+using Testing::OneHour;
 using testing::StartsWith;
 
 class AcceptingFactory final : public SamlTokenFactory {
@@ -34,17 +41,6 @@ class AcceptingFactory final : public SamlTokenFactory {
   }
 };
 
-std::string IssueAnswer() {
-  return Testing::Envelope(
-      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
-}
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
-}
-
 template <class Config>
 std::string ArgumentError(const Config& config) {
   try {
@@ -53,6 +49,14 @@ std::string ArgumentError(const Config& config) {
     return error.Message();
   }
   return "none";
+}
+
+constexpr char kNoKey[] = "No HolderOfKeyConfig provided. Unable to acquire token by certificate";
+
+template <class Config>
+std::string ByCertificateWithoutAKey(const Config& config) {
+  return TestSupport::ThrownMessage<Tarnik::InvalidStateException>(
+      [&] { CreateSecurityTokenService(config)->AcquireTokenByCertificate(OneHour()); });
 }
 
 class CreateSecurityTokenServiceTest : public testing::Test {
@@ -88,6 +92,26 @@ TEST_F(CreateSecurityTokenServiceTest, TheFlagChangesNothing) {
 TEST_F(CreateSecurityTokenServiceTest, ReadsTheConfigurationOnce) {
   const auto service = CreateSecurityTokenService(config_);
   config_ = {};
+  EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
+}
+
+TEST_F(CreateSecurityTokenServiceTest, SignsWithTheConfiguredKeyOrNotAtAll) {
+  const auto credential = Testing::KeyCredential();
+  EXPECT_EQ(ByCertificateWithoutAKey(config_), kNoKey);
+  config_.holderOfKeyConfig = Testing::ConfigOf(credential);
+  CreateSecurityTokenService(config_)->AcquireTokenByCertificate(OneHour());
+  const auto request = server_.Requests().at(0);
+  const auto verdict =
+      DevSts::VerifyXml(request.substr(request.find("\r\n\r\n") + 4), credential.certificatePem);
+  EXPECT_TRUE(verdict.valid) << verdict.reason;
+}
+
+TEST_F(CreateSecurityTokenServiceTest, TheKeyInfoResolverIsNotForTheService) {
+  const auto resolver = TestSupport::TrustedResolver();
+  config_.keyInfoResolver = resolver.get();
+  const auto service = CreateSecurityTokenService(config_);
+  EXPECT_EQ(resolver->RefCount(), 1);
+  // The answered token is signed by nobody.
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
 }
 
@@ -136,6 +160,12 @@ TEST_F(CreateSecurityTokenServiceExTest, SendsThroughTheCallersAgentFor240Second
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
   EXPECT_THAT(agent_->waitTimeouts, testing::ElementsAre(240'000'000UL, 240'000'000UL));
+}
+
+TEST_F(CreateSecurityTokenServiceExTest, SignsWithTheConfiguredKeyOrNotAtAll) {
+  EXPECT_EQ(ByCertificateWithoutAKey(configEx_), kNoKey);
+  configEx_.holderOfKeyConfig = Testing::ConfigOf(Testing::KeyCredential());
+  EXPECT_NE(CreateSecurityTokenService(configEx_)->AcquireTokenByCertificate(OneHour()), nullptr);
 }
 
 TEST_F(CreateSecurityTokenServiceExTest, UsesTheUrlAsTheRequestTarget) {

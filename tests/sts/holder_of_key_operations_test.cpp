@@ -15,6 +15,7 @@
 #include "sts/request_builder_impl.h"
 #include "sts/response_handler_impl.h"
 #include "sts/security_token_service_impl.h"
+#include "sts/token_specs.h"
 #include "support/holder_of_key.h"
 #include "support/vtable_slot.h"
 
@@ -24,27 +25,15 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using Testing::IssueAnswer;
 using testing::Not;
-
-std::string IssueAnswer() {
-  return Testing::Envelope(
-      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
-}
-
-std::string RenewAnswer() {
-  return Testing::Envelope(Testing::Rstr(Testing::Requested(Testing::kAssertionXml)));
-}
+using Testing::OneHour;
+using Testing::RenewAnswer;
 
 std::string StatusAnswer(const std::string& code) {
   return Testing::Envelope(Testing::Rstr(
       "<wst:Status><wst:Code>http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/" + code +
       "</wst:Code></wst:Status>"));
-}
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
 }
 
 Testing::FakeSamlToken Presented() {
@@ -100,6 +89,7 @@ TEST(HolderOfKeyOperationsTest, ByTokenIsTraced) {
   const auto presented = Presented();
   const auto token = sts.Service()->AcquireTokenByToken(presented, OneHour());
   ASSERT_NE(token, nullptr);
+  EXPECT_THAT(sts.factory->tolerances, ElementsAre(600));
   EXPECT_THAT(sts.transport->bodies.front(), HasSubstr("<Presented ID=\"_1\"/>"));
   EXPECT_THAT(log.Lines(),
               ElementsAre(Start("AcquireTokenByToken"),
@@ -181,6 +171,31 @@ TEST(HolderOfKeyOperationsAsyncTest, TwinsGiveTokens) {
     EXPECT_EQ(report.errorType, "");
     EXPECT_NE(report.token, nullptr);
   }
+}
+
+TEST(HolderOfKeyOperationsAsyncTest, TwinsAskForTheSame) {
+  const Sts sts(IssueAnswer());
+  const auto service = sts.Service();
+  const auto presented = Presented();
+  auto spec = OneHour();
+  spec.audienceRestriction = {"urn:audience"};
+  const auto requestLine = [](const auto& start) {
+    const Testing::LogCapture log(7);
+    Testing::AsyncCall call;
+    start(call.Callback());
+    call.Wait();
+    return log.Lines().at(1);
+  };
+  EXPECT_EQ(requestLine([&](auto done) { service->AcquireTokenAsync("bob", "pw", spec, done); }),
+            "7 Requested token for subject `bob', spec `" + Describe(spec) + "'");
+  EXPECT_EQ(requestLine([&](auto done) { service->AcquireTokenByCertificateAsync(spec, done); }),
+            "7 Requested token with spec `" + Describe(spec) + "'");
+  EXPECT_EQ(
+      requestLine([&](auto done) { service->AcquireTokenByTokenAsync(presented, spec, done); }),
+      "7 Requested token for " + CreateSamlTokenDescription(presented) + " with spec `" +
+          Describe(spec) + "'");
+  EXPECT_EQ(requestLine([&](auto done) { service->RenewTokenAsync(presented, 77, done); }),
+            "7 Renewing token " + CreateSamlTokenDescription(presented) + " for 77 more seconds");
 }
 
 TEST(HolderOfKeyOperationsAsyncTest, ThreadsMaySignWithOneServiceThatIsReleasedMeanwhile) {

@@ -2,6 +2,7 @@
 #include <tarnik/core/exception.h>
 
 #include <functional>
+#include <future>
 #include <string>
 #include <vector>
 
@@ -12,6 +13,7 @@
 #include "sts/request_builder_impl.h"
 #include "sts/response_handler_impl.h"
 #include "sts/security_token_service_impl.h"
+#include "sts/token_specs.h"
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 
@@ -21,7 +23,10 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using Testing::LastLegAnswer;
+using Testing::LegAnswer;
 using testing::Not;
+using Testing::OneHour;
 using TestSupport::ThrownMessage;
 
 using Leg = std::vector<unsigned char>;
@@ -29,26 +34,6 @@ using LegHandle = std::shared_ptr<const Leg>;
 
 constexpr char kContractError[] =
     "4 GSS contract error: non-empty user leg after negotiation is complete";
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
-}
-
-// "AQID" is 1, 2, 3.
-constexpr char kServerLeg[] = "<wst:BinaryExchange>AQID</wst:BinaryExchange>";
-
-std::string LegAnswer(const std::string& context) {
-  return Testing::Envelope(Testing::Rstr(kServerLeg, " Context=\"" + context + "\""));
-}
-
-std::string FinalAnswer(const std::string& leg = {}, const std::string& context = "c") {
-  return Testing::Envelope(Testing::Collection(
-      Testing::Rstr(leg + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
-                        Testing::Requested(Testing::kAssertionXml),
-                    " Context=\"" + context + "\"")));
-}
 
 // Answers each call with the next leg, and records what it was given.
 class ScriptedHandler final : public NegotiationHandler {
@@ -90,7 +75,7 @@ class Sts {
 };
 
 TEST(NegotiatedLoginTest, ATokenOnTheFirstLegEndsTheLoopAfterOneExchange) {
-  const Sts sts({FinalAnswer()});
+  const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({7})});
   const auto token = sts.Service()->AcquireTokenByGSS(OneHour(), handler);
   ASSERT_NE(token, nullptr);
@@ -103,17 +88,20 @@ TEST(NegotiatedLoginTest, ATokenOnTheFirstLegEndsTheLoopAfterOneExchange) {
 }
 
 TEST(NegotiatedLoginTest, LaterLegsContinueTheNegotiationInOneSession) {
-  const Sts sts({LegAnswer("first"), LegAnswer("second"), FinalAnswer()});
+  const Sts sts({LegAnswer("first"),
+                 LegAnswer("second", "<wst:BinaryExchange>BAU=</wst:BinaryExchange>"),
+                 LastLegAnswer()});
   ScriptedHandler handler({LegOf({1}), LegOf({2}), LegOf({})});
   EXPECT_NE(sts.Service()->AcquireTokenByGSS(OneHour(), handler), nullptr);
   EXPECT_EQ(sts.transport->sessions, 1);
-  EXPECT_THAT(handler.received, ElementsAre(Leg{}, Leg({1, 2, 3}), Leg({1, 2, 3})));
+  EXPECT_THAT(handler.received, ElementsAre(Leg{}, Leg({1, 2, 3}), Leg({4, 5})));
   const std::string issue = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
   const std::string next = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RSTR/Issue";
   EXPECT_THAT(sts.transport->actions, ElementsAre(issue, next, next));
   EXPECT_THAT(sts.transport->bodies[0], HasSubstr("<wst:RequestSecurityToken "));
   EXPECT_THAT(sts.transport->bodies[1],
               HasSubstr("<wst:RequestSecurityTokenResponse Context=\"first\">"));
+  EXPECT_THAT(sts.transport->bodies[1], HasSubstr(">Ag==</wst:BinaryExchange>"));
   // The context is the one of the last answer.
   EXPECT_THAT(sts.transport->bodies[2],
               HasSubstr("<wst:RequestSecurityTokenResponse Context=\"second\">"));
@@ -121,7 +109,7 @@ TEST(NegotiatedLoginTest, LaterLegsContinueTheNegotiationInOneSession) {
 }
 
 TEST(NegotiatedLoginTest, TheOperationIsTraced) {
-  const Sts sts({FinalAnswer()});
+  const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({7})});
   const Testing::LogCapture log(7);
   const auto token = sts.Service()->AcquireTokenByGSS(OneHour(), handler);
@@ -141,7 +129,7 @@ struct LastLegCase {
 class LastLegTest : public testing::TestWithParam<LastLegCase> {};
 
 TEST_P(LastLegTest, IsHandedToTheHandlerWhoseAnswerIsNotSent) {
-  const Sts sts({FinalAnswer(kServerLeg)});
+  const Sts sts({LastLegAnswer(Testing::kAssertionXml, Testing::kLeg)});
   ScriptedHandler handler({LegOf({7}), GetParam().afterTheLast});
   const Testing::LogCapture log(4);
   EXPECT_NE(sts.Service()->AcquireTokenByGSS(OneHour(), handler), nullptr);
@@ -160,8 +148,20 @@ INSTANTIATE_TEST_SUITE_P(Answers, LastLegTest,
                                          LastLegCase{"Bytes", LegOf({9}), false}),
                          [](const auto& tested) { return tested.param.name; });
 
+TEST(NegotiatedLoginTest, TheLastLegIsHandedOverBeforeTheTokenIsMade) {
+  const Sts sts({LastLegAnswer(Testing::kAssertionXml, Testing::kLeg)});
+  sts.factory->isRefusing = true;
+  ScriptedHandler handler({LegOf({7}), nullptr});
+  const Testing::LogCapture log(5);
+  EXPECT_EQ(ThrownMessage<InvalidSignatureException>(
+                [&] { sts.Service()->AcquireTokenByGSS(OneHour(), handler); }),
+            "refused");
+  EXPECT_THAT(handler.received, ElementsAre(Leg{}, Leg({1, 2, 3})));
+  EXPECT_THAT(log.Lines(), ElementsAre(kContractError));
+}
+
 TEST(NegotiatedLoginTest, ANullLegFailsBeforeAnythingIsSent) {
-  const Sts sts({FinalAnswer()});
+  const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({nullptr});
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
                 [&] { sts.Service()->AcquireTokenByGSS(OneHour(), handler); }),
@@ -179,7 +179,7 @@ TEST(NegotiatedLoginTest, ANullLegLaterEndsTheLogin) {
 }
 
 TEST(NegotiatedLoginTest, AnAnswerWithoutAContextIsRefusedEvenWithAToken) {
-  for (const auto& answer : {LegAnswer(""), FinalAnswer("", "")}) {
+  for (const auto& answer : {LegAnswer(""), LastLegAnswer(Testing::kAssertionXml, "", "")}) {
     const Sts sts({answer});
     ScriptedHandler handler({LegOf({1})});
     EXPECT_EQ(ThrownMessage<CommunicationException>(
@@ -190,12 +190,20 @@ TEST(NegotiatedLoginTest, AnAnswerWithoutAContextIsRefusedEvenWithAToken) {
 }
 
 TEST(NegotiatedLoginTest, TheLifetimeIsJudgedBeforeAnythingIsSent) {
-  const Sts sts({FinalAnswer()});
+  const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({1})});
+  const Testing::LogCapture log(7);
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
                 [&] { sts.Service()->AcquireTokenByGSS(TokenSpec(), handler); }),
             "Token lifetime must be positive");
   EXPECT_THAT(sts.transport->bodies, IsEmpty());
+  // The session and the leg come first.
+  EXPECT_EQ(sts.transport->sessions, 1);
+  EXPECT_THAT(handler.received, ElementsAre(Leg{}));
+  EXPECT_THAT(log.Lines(),
+              ElementsAre("7 START operation SecurityTokenServiceImpl::AcquireTokenByGSS",
+                          "7 Requested token with spec `" + Describe(TokenSpec()) + "'",
+                          "7 END operation SecurityTokenServiceImpl::AcquireTokenByGSS"));
 }
 
 struct HandlersOwnFailure {};
@@ -215,7 +223,9 @@ TEST(NegotiatedLoginTest, WhatTheHandlerThrowsPassesUnchanged) {
   EXPECT_THROW(Sts({LegAnswer("c")}).Service()->AcquireTokenByGSS(OneHour(), handler),
                HandlersOwnFailure);
   const Testing::LogCapture log(7);
-  EXPECT_THROW(Sts({FinalAnswer(kServerLeg)}).Service()->AcquireTokenByGSS(OneHour(), handler),
+  EXPECT_THROW(Sts({LastLegAnswer(Testing::kAssertionXml, Testing::kLeg)})
+                   .Service()
+                   ->AcquireTokenByGSS(OneHour(), handler),
                HandlersOwnFailure);
   EXPECT_EQ(log.Lines().back(), "7 END operation SecurityTokenServiceImpl::AcquireTokenByGSS");
 }
@@ -223,22 +233,52 @@ TEST(NegotiatedLoginTest, WhatTheHandlerThrowsPassesUnchanged) {
 TEST(NegotiatedLoginAsyncTest, TheTwinReportsTokenAndErrors) {
   ScriptedHandler handler({LegOf({1})});
   Testing::AsyncCall call;
-  Sts({FinalAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
+  auto spec = OneHour();
+  spec.audienceRestriction = {"urn:audience"};
+  const Testing::LogCapture log(7);
+  Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(spec, handler, call.Callback());
   EXPECT_NE(call.Wait().token, nullptr);
+  EXPECT_EQ(log.Lines().at(1), "7 Requested token with spec `" + Describe(spec) + "'");
   ScriptedHandler nullHandler({nullptr});
   Testing::AsyncCall failing;
-  Sts({FinalAnswer()})
+  Sts({LastLegAnswer()})
       .Service()
       ->AcquireTokenByGSSAsync(OneHour(), nullHandler, failing.Callback());
   EXPECT_EQ(failing.Wait().errorType, typeid(Tarnik::InvalidArgumentException).name());
-  EXPECT_THROW(Sts({FinalAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, nullptr),
-               Tarnik::InvalidArgumentException);
+  EXPECT_THROW(
+      Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, nullptr),
+      Tarnik::InvalidArgumentException);
+}
+
+// Waits within its first leg.
+class WaitingHandler final : public NegotiationHandler {
+ public:
+  LegHandle Negotiate(const Leg&) override {
+    isGoingOn.get_future().wait();
+    return LegOf({1});
+  }
+
+  std::promise<void> isGoingOn;
+};
+
+TEST(NegotiatedLoginAsyncTest, ACallReturnsAtOnceAndWorksWithACopyOfTheService) {
+  const Sts sts({LastLegAnswer()});
+  auto service = sts.Service();
+  const std::weak_ptr<const SecurityTokenService> original = service;
+  WaitingHandler handler;
+  Testing::AsyncCall call;
+  service->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
+  service = nullptr;
+  EXPECT_TRUE(original.expired());
+  handler.isGoingOn.set_value();
+  EXPECT_NE(call.Wait().token, nullptr);
+  EXPECT_EQ(sts.transport->bodies.size(), 1U);
 }
 
 TEST(NegotiatedLoginTest, OperationsStandInTheirOrder) {
   using TestSupport::VtableSlot;
   using Token = std::shared_ptr<const SamlToken>;
-  const auto service = Sts({FinalAnswer()}).Service();
+  const auto service = Sts({LastLegAnswer()}).Service();
   const SecurityTokenService* object = service.get();
   ScriptedHandler handler({LegOf({1})});
   EXPECT_NE((VtableSlot<Token(const void*, const TokenSpec&, NegotiationHandler&)>(object, 1)(

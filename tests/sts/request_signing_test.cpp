@@ -5,6 +5,7 @@
 
 #include <chrono>
 #include <functional>
+#include <regex>
 #include <string>
 
 #include "sts/request_builder_impl.h"
@@ -14,6 +15,11 @@
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 #include "xml/built_xml.h"
+#include "xml/issue_body.h"
+#include "xml/renew_body.h"
+#include "xml/validate_body.h"
+#include "xml/xml_body_builder_continued_spnego.h"
+#include "xml/xml_body_builder_initial_spnego.h"
 
 namespace SsoClient {
 namespace {
@@ -95,6 +101,12 @@ std::vector<std::string> HeaderOf(const std::string& envelope) {
     names.emplace_back(static_cast<const Tarnik::Xml::ElementNode*>(node)->QualifiedNameText());
   }
   return names;
+}
+
+const std::vector<Operation>& AllOperations() {
+  static const std::vector<Operation> operations{
+      ByPassword, InitialLeg, ContinuedLeg, ByCertificate, ByToken, Validate, Renew};
+  return operations;
 }
 
 // What a request is to be; an error message instead of a header when it is refused.
@@ -265,6 +277,74 @@ TEST(RequestSigningActionTest, EachOperationHasItsAction) {
   EXPECT_EQ(action(ByToken), kIssueAction);
   EXPECT_EQ(action(Validate), kValidateAction);
   EXPECT_EQ(action(Renew), kRenewAction);
+}
+
+std::string WithoutContext(const std::string& xml) {
+  static const std::regex drawn(" Context=\"urn:uuid:[-0-9a-f]{36}\"");
+  return std::regex_replace(xml, drawn, " Context=\"DRAWN\"");
+}
+
+std::string BodyOf(const std::string& envelope) {
+  const auto document = Testing::ParseXml(envelope);
+  const auto body =
+      Testing::XmlText(document->RootElement()->FirstChildElement("Body")->FirstChild());
+  return WithoutContext(Testing::WithoutTimes(body));
+}
+
+TEST(RequestSigningBodyTest, IsThatOfTheOperation) {
+  const auto expected = [](const XMLBaseBuilder& builder) {
+    return WithoutContext(Testing::WithoutTimes(Testing::BuiltXml(builder)));
+  };
+  const auto token = PresentedToken();
+  const auto builder = BuilderWithKey();
+  const auto body = [&](const Operation& operation, const TokenSpec& spec) {
+    SoapRequest request;
+    operation(builder, spec, request);
+    return BodyOf(request.body);
+  };
+  auto spec = SpecOf(60);
+  spec.audienceRestriction = {"urn:audience"};
+  EXPECT_EQ(body(ByPassword, spec), expected(*BuildIssueBodyWithUseKey(1, spec)));
+  EXPECT_EQ(body(InitialLeg, spec), expected(XMLBodyBuilderInitialSPNego(1, spec, {1})));
+  EXPECT_EQ(body(ContinuedLeg, spec), expected(XMLBodyBuilderContinuedSPNego("c", {1})));
+  EXPECT_EQ(body(ByCertificate, spec), expected(*BuildIssueBodyWithUseKey(1, spec)));
+  EXPECT_EQ(body(ByToken, spec), expected(*BuildIssueBody(1, spec)));
+  EXPECT_EQ(body(Validate, spec), expected(*BuildValidateBody(token)));
+  EXPECT_EQ(body(Renew, spec), expected(*BuildRenewBody(token, 60)));
+  spec.confirmation = CONFIRMATION_BEARER;
+  EXPECT_EQ(body(ByPassword, spec), expected(*BuildIssueBodyWithUseKey(0, spec)));
+  EXPECT_EQ(body(InitialLeg, spec), expected(XMLBodyBuilderInitialSPNego(0, spec, {1})));
+  EXPECT_EQ(body(ByToken, spec), expected(*BuildIssueBody(0, spec)));
+}
+
+std::int64_t Microseconds(const Tarnik::Xml::ElementNode& envelope, const char* part,
+                          const char* container, const char* element) {
+  return Testing::TimeAt(envelope, {part, container, element, "Expires"}).GetUtcTime() -
+         Testing::TimeAt(envelope, {part, container, element, "Created"}).GetUtcTime();
+}
+
+TEST(RequestSigningTimesTest, EveryTimestampIsValidForTenMinutes) {
+  for (const Operation& operation : AllOperations()) {
+    SoapRequest request;
+    operation(BuilderWithKey(), SpecOf(60), request);
+    const auto document = Testing::ParseXml(request.body);
+    EXPECT_EQ(Microseconds(*document->RootElement(), "Header", "Security", "Timestamp"),
+              600'000'000);
+  }
+}
+
+TEST(RequestSigningTimesTest, TheLifetimeAskedForIsThatOfTheSpecOrTheRenewal) {
+  for (const Operation& operation :
+       {Operation(ByPassword), Operation(InitialLeg), Operation(ByCertificate), Operation(ByToken),
+        Operation(Renew)}) {
+    for (const std::int64_t seconds : {1, 77}) {
+      SoapRequest request;
+      operation(BuilderWithKey(), SpecOf(seconds), request);
+      const auto document = Testing::ParseXml(request.body);
+      EXPECT_EQ(Microseconds(*document->RootElement(), "Body", "RequestSecurityToken", "Lifetime"),
+                seconds * 1'000'000);
+    }
+  }
 }
 
 TEST(RequestSigningOrderTest, TheLifetimeIsJudgedFirst) {

@@ -45,11 +45,11 @@ TEST(ResponseElementsTest, FindDescendantTakesTheFirstOfEachName) {
   EXPECT_EQ(FindDescendant(root, {"missing", "b"}), nullptr);
 }
 
-TEST(ResponseElementsTest, CanonicalTextCarriesTheNamespacesThatAreInherited) {
-  const auto document =
-      Testing::ParseXml(R"(<r xmlns="urn:d" xmlns:q="urn:q" xml:lang="en"><a z="1" b='2'/></r>)");
+TEST(ResponseElementsTest, CanonicalTextCarriesTheNamespacesThatAreInheritedAndNoComments) {
+  const auto document = Testing::ParseXml(
+      R"(<r xmlns="urn:d" xmlns:q="urn:q" xml:lang="en"><a z="1" b='2'><!--c-->t</a></r>)");
   EXPECT_EQ(CanonicalizeElement(document->RootElement()->FirstChildElement("a")),
-            R"(<a xmlns="urn:d" xmlns:q="urn:q" b="2" z="1" xml:lang="en"></a>)");
+            R"(<a xmlns="urn:d" xmlns:q="urn:q" b="2" z="1" xml:lang="en">t</a>)");
   EXPECT_EQ(CanonicalizeElement(nullptr), "");
 }
 

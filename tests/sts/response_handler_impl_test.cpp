@@ -3,12 +3,15 @@
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/xml/xml_parse_exception.h>
 
 #include <functional>
 #include <string>
 #include <typeinfo>
 
 #include "sts/answers.h"
+#include "support/parse_xml.h"
+#include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 
 namespace SsoClient {
@@ -19,11 +22,14 @@ using testing::ElementsAre;
 using Testing::Envelope;
 using Testing::Fault;
 using testing::IsEmpty;
+using Testing::IssueAnswer;
 using Testing::kAssertionXml;
 using Testing::kCanonicalAssertion;
+using Testing::RenewAnswer;
 using Testing::Requested;
 using Testing::Rstr;
 using testing::StartsWith;
+using TestSupport::ThrownMessage;
 
 constexpr char kFormat[] = "Unexpected XML format";
 constexpr char kNoBody[] = "Unexpected response format: missing SAOP Body.";
@@ -75,12 +81,6 @@ const std::vector<std::pair<std::string, Parser>>& AllParsers() {
   return kParsers;
 }
 
-std::string IssueAnswer() {
-  return Envelope(Collection(Rstr(Requested(kAssertionXml))));
-}
-std::string RenewAnswer() {
-  return Envelope(Rstr(Requested(kAssertionXml)));
-}
 std::string StatusAnswer(const std::string& code) {
   return Envelope(Rstr("<wst:Status><wst:Code>" + code + "</wst:Code></wst:Status>"));
 }
@@ -100,8 +100,9 @@ TEST(ResponseHandlerImplTest, AnAnswerThatIsNoXmlSaysWhy) {
   for (const auto& [name, parse] : AllParsers()) {
     for (const std::string answer : {"", "no XML", "<a>", "<a></b>", "<a/><b/>", "<p:a/>",
                                      "<!DOCTYPE a><a/>", "<a>\xff</a>", "<a b='1' b='2'/>"}) {
-      EXPECT_THAT(Failure([&, &parser = parse] { parser(answer); }),
-                  StartsWith("Response is not well-formed XML: "))
+      EXPECT_EQ(Failure([&, &parser = parse] { parser(answer); }),
+                "Response is not well-formed XML: " + ThrownMessage<Tarnik::Xml::XMLParseException>(
+                                                          [&] { Testing::ParseXml(answer); }))
           << name << ": " << answer;
     }
   }
@@ -181,16 +182,30 @@ class FailingReader final : public Tarnik::Reader, public Tarnik::ObjectImpl {
 TEST(ResponseHandlerImplTest, FailuresOfTheReaderPassUnchanged) {
   const auto reader = Tarnik::MakeRef<FailingReader>();
   std::string assertion = "kept";
-  EXPECT_THROW(ResponseHandlerImpl().ParseIssueResponse(reader.get(), assertion),
-               Tarnik::IOException);
+  EXPECT_EQ(ThrownMessage<Tarnik::IOException>(
+                [&] { ResponseHandlerImpl().ParseIssueResponse(reader.get(), assertion); }),
+            "cut off");
   EXPECT_EQ(assertion, "kept");
 }
 
 TEST(ResponseHandlerImplTest, AFailureLeavesTheOutputAsItWas) {
+  const ResponseHandlerImpl handler;
   std::string assertion = "kept";
-  const auto reader = Tarnik::CreateStringReader(Envelope(""));
-  EXPECT_THROW(ResponseHandlerImpl().ParseIssueResponse(reader.get(), assertion), SsoException);
+  EXPECT_THROW(
+      handler.ParseIssueResponse(Tarnik::CreateStringReader(Envelope("")).get(), assertion),
+      SsoException);
   EXPECT_EQ(assertion, "kept");
+  EXPECT_THROW(
+      handler.ParseRenewResponse(Tarnik::CreateStringReader(Envelope("")).get(), assertion),
+      SsoException);
+  EXPECT_EQ(assertion, "kept");
+}
+
+TEST(NegotiationResponseTest, HoldsItsFieldsInOrder) {
+  const NegotiationResponse response = {"context", {7}, "token"};
+  EXPECT_EQ(response.contextId, "context");
+  EXPECT_THAT(response.leg, ElementsAre(7));
+  EXPECT_EQ(response.token, "token");
 }
 
 // Issue.
@@ -256,6 +271,16 @@ TEST(ParseRenewResponseTest, GivesTheCanonicalAssertion) {
   EXPECT_EQ(ParseRenew(RenewAnswer()), kCanonicalAssertion);
 }
 
+TEST(ParseRenewResponseTest, OfTwoResponsesOrAssertionsTheFirstCounts) {
+  const std::string second = "<Assertion n=\"2\"/>";
+  EXPECT_EQ(ParseRenew(Envelope(Rstr("<wst:TokenType>any</wst:TokenType><wst:Lifetime/>" +
+                                     Requested(kAssertionXml + second) + Requested(second)) +
+                                Rstr(Requested(second)))),
+            kCanonicalAssertion);
+  EXPECT_EQ(Failure([] { ParseRenew(Envelope(Rstr("") + Rstr(Requested(kAssertionXml)))); }),
+            kFormat);
+}
+
 TEST(ParseRenewResponseTest, EveryElementOnTheWayIsNeededAndNoCollection) {
   for (const auto& body : {std::string(), Collection(Rstr(Requested(kAssertionXml))), Rstr(""),
                            Rstr(Requested("")), Rstr(kAssertionXml), Requested(kAssertionXml)}) {
@@ -269,6 +294,15 @@ TEST(ParseValidateResponseTest, TellsTheVerdict) {
   EXPECT_TRUE(ParseValidate(StatusAnswer(kValid)));
   EXPECT_FALSE(ParseValidate(StatusAnswer(kInvalid)));
   EXPECT_TRUE(ParseValidate(StatusAnswer("<![CDATA[" + std::string(kValid) + "]]>")));
+}
+
+TEST(ParseValidateResponseTest, OnlyTheFirstTextAndTheFirstElementsCount) {
+  EXPECT_TRUE(ParseValidate(StatusAnswer(kValid + std::string("<b/>more"))));
+  const auto status = [](const std::string& code) {
+    return "<wst:Status><wst:Code>" + code + "</wst:Code><wst:Code>x</wst:Code></wst:Status>";
+  };
+  EXPECT_FALSE(
+      ParseValidate(Envelope(Rstr(status(kInvalid) + status(kValid)) + Rstr(status(kValid)))));
 }
 
 TEST(ParseValidateResponseTest, AnyOtherCodeIsUnexpected) {
@@ -323,6 +357,27 @@ TEST(ParseNegotiationResponseTest, AResponseOutsideOfACollectionIsIntermediate) 
                Rstr(kLeg, " Context=\"intermediate\"")));
   EXPECT_EQ(response.contextId, "intermediate");
   EXPECT_EQ(response.token, "");
+}
+
+TEST(ParseNegotiationResponseTest, OfTwoFinalAnswersTheFirstCounts) {
+  const auto response = ParseNegotiation(
+      Envelope(Collection(Rstr(kSamlType + Requested(kAssertionXml), " Context=\"first\"") +
+                          Rstr(kLeg + std::string(kSamlType) + Requested("<Assertion n=\"2\"/>"),
+                               " Context=\"second\""))));
+  EXPECT_EQ(response.contextId, "first");
+  EXPECT_THAT(response.leg, IsEmpty());
+  EXPECT_EQ(response.token, kCanonicalAssertion);
+}
+
+// The context, the leg, the assertion, the token type.
+TEST(ParseNegotiationResponseTest, WhatIsMissingIsToldInTheOrderOfReading) {
+  const std::string badLeg = "<wst:BinaryExchange>!</wst:BinaryExchange>";
+  EXPECT_EQ(Failure([&] { ParseNegotiation(Envelope(Rstr(badLeg))); }), kFormat);
+  EXPECT_EQ(Failure([&] { ParseNegotiation(Envelope(Collection(Rstr(badLeg)))); }), kFormat);
+  const std::string badType = "<wst:TokenType>urn:other</wst:TokenType>";
+  EXPECT_EQ(Failure([&] { ParseNegotiation(FinalLegAnswer(badLeg + badType)); }),
+            "Base64 format exception");
+  EXPECT_EQ(Failure([&] { ParseNegotiation(FinalLegAnswer(badType)); }), kFormat);
 }
 
 TEST(ParseNegotiationResponseTest, AnIntermediateLegIsNeeded) {

@@ -11,7 +11,10 @@
 #include "sts/log_capture.h"
 #include "sts/request_builder_impl.h"
 #include "sts/response_handler_impl.h"
+#include "sts/token_specs.h"
 #include "support/fake_saml_token.h"
+#include "support/holder_of_key.h"
+#include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 
 namespace SsoClient {
@@ -23,7 +26,9 @@ using Testing::FakeTokenFactory;
 using Testing::FakeTransport;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using Testing::IssueAnswer;
 using testing::Not;
+using Testing::OneHour;
 
 class EmptyResponseHandler final : public ResponseHandler {
  public:
@@ -35,17 +40,6 @@ class EmptyResponseHandler final : public ResponseHandler {
   void ParseNegotiationResponse(Tarnik::Reader*, NegotiationResponse&) const override {}
 };
 
-std::string IssueAnswer() {
-  return Testing::Envelope(
-      Testing::Collection(Testing::Rstr(Testing::Requested(Testing::kAssertionXml))));
-}
-
-TokenSpec OneHour() {
-  TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  return spec;
-}
-
 class SecurityTokenServiceImplTest : public testing::Test {
  protected:
   explicit SecurityTokenServiceImplTest(const std::string& answer = IssueAnswer())
@@ -53,11 +47,11 @@ class SecurityTokenServiceImplTest : public testing::Test {
 
   std::shared_ptr<SecurityTokenServiceImpl> MakeService() const {
     return std::make_shared<SecurityTokenServiceImpl>(
-        std::make_shared<RequestBuilderImpl>(boost::none), transport_, handler_, factory_);
+        std::make_shared<RequestBuilderImpl>(boost::none), transport_,
+        std::make_shared<ResponseHandlerImpl>(), factory_);
   }
 
   std::shared_ptr<FakeTransport> transport_;
-  std::shared_ptr<const ResponseHandler> handler_ = std::make_shared<ResponseHandlerImpl>();
   std::shared_ptr<FakeTokenFactory> factory_ = std::make_shared<FakeTokenFactory>();
 };
 
@@ -83,9 +77,16 @@ TEST_F(SecurityTokenServiceImplTest, EveryOperationHasASessionOfItsOwn) {
 }
 
 TEST_F(SecurityTokenServiceImplTest, AnEmptyAssertionGivesNoToken) {
-  handler_ = std::make_shared<EmptyResponseHandler>();
+  const SecurityTokenServiceImpl service(
+      std::make_shared<RequestBuilderImpl>(Testing::ConfigOf(Testing::KeyCredential())), transport_,
+      std::make_shared<EmptyResponseHandler>(), factory_);
+  Testing::FakeSamlToken presented("<Presented ID=\"_1\"/>");
+  presented.confirmationType = HOLDER_OF_KEY;
   const Testing::LogCapture log(9);
-  EXPECT_EQ(MakeService()->AcquireToken("alice", "pw", OneHour()), nullptr);
+  EXPECT_EQ(service.AcquireToken("alice", "pw", OneHour()), nullptr);
+  EXPECT_EQ(service.AcquireTokenByCertificate(OneHour()), nullptr);
+  EXPECT_EQ(service.AcquireTokenByToken(presented, OneHour()), nullptr);
+  EXPECT_EQ(service.RenewToken(presented, 60), nullptr);
   EXPECT_THAT(factory_->texts, IsEmpty());
   EXPECT_THAT(log.Lines(), Not(testing::Contains(HasSubstr("Successfully"))));
 }
@@ -156,7 +157,9 @@ TEST_F(SecurityTokenServiceImplTest, FailuresOfTheExchangePassUnchanged) {
 TEST_F(SecurityTokenServiceImplTest, RefusalsOfTheTokenFactoryPassUnchanged) {
   factory_->isRefusing = true;
   const Testing::LogCapture log(7);
-  EXPECT_THROW(MakeService()->AcquireToken("alice", "pw", OneHour()), InvalidSignatureException);
+  EXPECT_EQ(TestSupport::ThrownMessage<InvalidSignatureException>(
+                [&] { MakeService()->AcquireToken("alice", "pw", OneHour()); }),
+            "refused");
   EXPECT_EQ(log.Lines().back(), "7 END operation SecurityTokenServiceImpl::AcquireToken");
   EXPECT_THAT(log.Lines(), Not(testing::Contains(HasSubstr("Successfully"))));
 }

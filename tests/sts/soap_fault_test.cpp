@@ -133,7 +133,12 @@ TEST(SoapFaultTest, NamespacesOfTheFaultsElementsAreNotCompared) {
             Expect<SsoException>("Unexpected SOAP fault: code; request failed."));
 }
 
-TEST(SoapFaultTest, OnlyTheFirstFaultCodeCounts) {
+TEST(SoapFaultTest, OnlyTheFirstFaultCodeAndTheFirstFaultStringCount) {
+  EXPECT_EQ(ThrownFor(Envelope(Fault("<faultcode>wst:FailedAuthentication</faultcode>"
+                                     "<faultstring>first</faultstring>"
+                                     "<faultstring>second</faultstring>"))),
+            Expect<InvalidCredentialsException>("Authentication failed: first"));
+
   EXPECT_EQ(ThrownFor(Envelope(Fault("<faultcode>S:Server</faultcode>"
                                      "<faultcode>wst:FailedAuthentication</faultcode>"))),
             Expect<SsoException>("Unexpected SOAP fault: S:Server; request failed."));

@@ -24,18 +24,11 @@ Ref<Tarnik::Xml::Document> ParseXml(const std::string& xml) {
 }
 
 ElementNode* FindElement(ElementNode* root, std::string_view localName) {
-  if (root->LocalName() == localName) {
-    return root;
+  ElementNode* element = root;
+  while (element != nullptr && element->LocalName() != localName) {
+    element = element->NextElement(root);
   }
-  for (Tarnik::Xml::Node* child = root->FirstChild(); child != nullptr;
-       child = child->NextSibling()) {
-    ElementNode* element = SsoClient::AsElement(child);
-    ElementNode* found = element == nullptr ? nullptr : FindElement(element, localName);
-    if (found != nullptr) {
-      return found;
-    }
-  }
-  return nullptr;
+  return element;
 }
 
 Fragment::Fragment(const std::string& content)

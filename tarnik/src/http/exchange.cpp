@@ -94,11 +94,13 @@ void Exchange::Connect() {
       [self](System::Stream* stream, const Exception* error) { self->OnConnected(stream, error); });
   {
     const std::lock_guard guard(mutex_);
+    // The completion may have been faster than this thread, and what it was given may even serve
+    // another exchange by now.
+    if (hasConnectEnded_) {
+      return;
+    }
     if (!hasEnded_) {
-      // The completion may have been faster than this thread.
-      if (work_.connection == nullptr) {
-        work_.connect = connect;
-      }
+      work_.connect = connect;
       return;
     }
   }
@@ -108,6 +110,11 @@ void Exchange::Connect() {
 }
 
 void Exchange::OnConnected(System::Stream* stream, const Exception* error) {
+  {
+    const std::lock_guard guard(mutex_);
+    hasConnectEnded_ = true;
+    work_.connect = nullptr;
+  }
   if (error != nullptr) {
     if (stream != nullptr) {
       stream->Close();
@@ -130,7 +137,6 @@ void Exchange::Begin(const Ref<Connection>& connection) {
     if (!hasEnded_) {
       request.swap(request_);
       work_.connection = connection;
-      work_.connect = nullptr;
     }
   }
   if (request == nullptr) {

@@ -105,6 +105,7 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   Work work_;
   Outcome outcome_;
   bool hasEnded_ = false;
+  bool hasConnectEnded_ = false;
   bool isDelivered_ = false;
   bool isWritten_ = false;
   /// The whole answer is there, and its connection is good for another once the request is written.

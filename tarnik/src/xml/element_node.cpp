@@ -85,6 +85,23 @@ std::optional<std::string_view> ElementNode::LookupNamespace(
   return std::nullopt;
 }
 
+ElementNode* ElementNode::NextElement(const ElementNode* top) const noexcept {
+  const ElementNode* element = this;
+  Node* next = FirstChild();
+  for (;;) {
+    for (; next != nullptr; next = next->NextSibling()) {
+      if (next->Kind() == NodeKind::kElement) {
+        return static_cast<ElementNode*>(next);
+      }
+    }
+    if (element == top) {
+      return nullptr;
+    }
+    next = element->NextSibling();
+    element = element->ParentElement();
+  }
+}
+
 std::size_t ElementNode::AttributeCount() const noexcept {
   return attributeCount_;
 }

@@ -253,14 +253,13 @@ INSTANTIATE_TEST_SUITE_P(Exchange, StalledExchangeTest,
                                          Stage::kBody));
 
 TEST_F(ExchangeTest, HoldsItsTimeLimitAgainstAByteNowAndThen) {
-  ScriptedSpec::Script script;
-  script.stream.onWritten = AnswerWith("HTTP/1.1 200 OK\r\n");
-  Use(script);
+  Use({});
   const auto item = Send(std::make_shared<Heard>(), 50000);
   ASSERT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
   const auto stream = spec_->Streams().front();
   std::atomic<bool> isOver{false};
   std::thread dribble([&] {
+    stream->Push("HTTP/1.1 200 OK\r\n");
     while (!isOver) {
       stream->Push("x");
       std::this_thread::sleep_for(std::chrono::milliseconds(1));
@@ -269,6 +268,21 @@ TEST_F(ExchangeTest, HoldsItsTimeLimitAgainstAByteNowAndThen) {
   EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), TimeoutException);
   isOver = true;
   dribble.join();
+}
+
+// The exchange may be over before the start of its connect returns, and the connection may serve
+// the next one.
+TEST_F(ExchangeTest, CancelsNoConnectThatHasEnded) {
+  const auto heard = std::make_shared<Heard>();
+  ScriptedSpec::Script script;
+  script.stream.onWritten = AnswerWith(kHello);
+  script.beforeStartReturns = [heard] {
+    EXPECT_TRUE(Eventually([&] { return heard->count == 1; }));
+  };
+  Use(script);
+  Send(heard);
+  EXPECT_EQ(heard->body, "hello");
+  EXPECT_EQ(spec_->CancelCount(), 0U);
 }
 
 TEST_F(ExchangeTest, ClosesAStreamThatIsConnectedAfterTheEnd) {

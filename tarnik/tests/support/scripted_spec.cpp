@@ -49,6 +49,9 @@ Ref<System::CancellableItem> ScriptedSpec::StartConnect(ConnectCompletion comple
           self->Complete(completion);
         });
   }
+  if (script_.beforeStartReturns) {
+    script_.beforeStartReturns();
+  }
   return System::CreateCancellableItem([held = held_] {
     const std::lock_guard guard(held->mutex);
     ++held->cancelCount;

@@ -32,6 +32,8 @@ class ScriptedSpec final : public Http::CustomConnectionSpec, public ObjectImpl 
     std::string startError = {};
     /// Connecting ends with a `CancelledException`, by the item, or not at all.
     bool holdConnects = false;
+    /// Runs before the start of a connect returns, whose completion may run meanwhile.
+    std::function<void()> beforeStartReturns = {};
     /// Connecting succeeds without giving a stream.
     bool givesNoStream = false;
   };

@@ -186,6 +186,30 @@ TEST(ElementNodeTest, LooksNamespacesUpInScope) {
   EXPECT_EQ(NewElement("p", "e")->NamespaceUri(), "");
 }
 
+std::string NamesFrom(const ElementNode* first, const ElementNode* top) {
+  std::string names;
+  for (const ElementNode* element = first; element != nullptr;
+       element = element->NextElement(top)) {
+    names += element->LocalName();
+  }
+  return names;
+}
+
+TEST(ElementNodeTest, WalksInDocumentOrderThroughTheElementAtTheTop) {
+  const Ref<Document> document =
+      ParseXml("<!--x--><a>text<b><c/><?p?>text<d/></b><!--x--><e/><f><g/></f>text</a><!--x-->");
+  const ElementNode* a = document->RootElement();
+  const ElementNode* b = a->FirstChildElement("b");
+  const ElementNode* c = b->FirstChildElement("c");
+  EXPECT_EQ(NamesFrom(a, nullptr), "abcdefg");
+  EXPECT_EQ(NamesFrom(a, a), "abcdefg");
+  EXPECT_EQ(NamesFrom(c, a), "cdefg");
+  EXPECT_EQ(NamesFrom(b, b), "bcd");
+  EXPECT_EQ(NamesFrom(c, b), "cd");
+  EXPECT_EQ(NamesFrom(c, c), "c");
+  EXPECT_EQ(NewElement("", "e")->NextElement(nullptr), nullptr);
+}
+
 TEST(ElementNodeTest, FindsChildElementsByName) {
   const Ref<Document> document =
       ParseXml("<r xmlns:p='urn:p'>text<!--x--><b/><p:a i='1'/><a i='2'/><p:a i='3'/></r>");

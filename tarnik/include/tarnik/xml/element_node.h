@@ -62,6 +62,12 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
   /// when the default namespace is undeclared with xmlns="". "xml" is always bound.
   std::optional<std::string_view> LookupNamespace(std::string_view prefix) const noexcept;
 
+  /// The next element in document order (XML Path Language 1.0, section 5) that stands in `top`:
+  /// the first one in this element or else the next one behind it; null after the last. `top` is
+  /// this element or one that holds it, or null for the whole tree. Steps through deep trees
+  /// without recursion.
+  ElementNode* NextElement(const ElementNode* top) const noexcept;
+
   std::size_t AttributeCount() const noexcept;
   /// Attribute `index`, from 0.
   const Attribute& AttributeAt(std::size_t index) const noexcept;

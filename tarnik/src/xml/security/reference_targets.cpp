@@ -1,5 +1,6 @@
 #include "xml/security/reference_targets.h"
 
+#include <tarnik/xml/document.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 #include <algorithm>
 #include <string_view>
@@ -32,23 +33,6 @@ constexpr bool IsIdCharacter(char c) noexcept {
 bool IsPlainId(std::string_view text) noexcept {
   return !text.empty() && (IsAsciiLetter(text[0]) || text[0] == '_') &&
          std::all_of(text.begin(), text.end(), IsIdCharacter);
-}
-
-const Node* FirstChildOf(const Node* node) noexcept {
-  if (node->Kind() != NodeKind::kElement && node->Kind() != NodeKind::kDocument) {
-    return nullptr;
-  }
-  return static_cast<const ParentNode*>(node)->FirstChild();
-}
-
-const Node* NextInDocument(const Node* node) noexcept {
-  if (const Node* child = FirstChildOf(node)) {
-    return child;
-  }
-  while (node != nullptr && node->NextSibling() == nullptr) {
-    node = node->Parent();
-  }
-  return node == nullptr ? nullptr : node->NextSibling();
 }
 
 bool MayBeTakenForId(std::string_view localName) noexcept {
@@ -93,11 +77,16 @@ void NoteIds(const ElementNode* element, std::vector<Search>& searches) {
   }
 }
 
+// The topmost node above an element is an element or a document.
+const ElementNode* RootElementOf(const Node* root) noexcept {
+  return root->Kind() == NodeKind::kDocument ? static_cast<const Document*>(root)->RootElement()
+                                             : static_cast<const ElementNode*>(root);
+}
+
 void NoteAllIds(const Node* root, std::vector<Search>& searches) {
-  for (const Node* node = root; node != nullptr; node = NextInDocument(node)) {
-    if (node->Kind() == NodeKind::kElement) {
-      NoteIds(static_cast<const ElementNode*>(node), searches);
-    }
+  for (const ElementNode* element = RootElementOf(root); element != nullptr;
+       element = element->NextElement(nullptr)) {
+    NoteIds(element, searches);
   }
 }
 
