@@ -17,6 +17,8 @@ DevSts::NegotiationScript TwoLegs() {
   return script;
 }
 
+const DevSts::NegotiationScript kOneLeg;
+
 class NegotiationFaultsTest : public RealmTest {
  protected:
   NegotiationFaultsTest() { Sts().SetNegotiationScript(TwoLegs()); }
@@ -33,9 +35,9 @@ TEST_F(NegotiationFaultsTest, AForgottenNegotiationIsTheServicesFault) {
   DevSts::LegMisbehavior leg;
   leg.forget = true;
   MisbehaveOnce(leg);
-  const std::string message = MessageOf<SsoException>(LogIn);
-  EXPECT_FALSE(Sts().LastRequest().answeredFault.empty());
-  EXPECT_THAT(message, HasSubstr(Sts().LastRequest().answeredFault));
+  EXPECT_EQ(MessageOf<SsoException>(LogIn),
+            "Unexpected SOAP fault: wst:InvalidRequest; request failed.");
+  EXPECT_THAT(Sts().LastRequest().answeredFault, HasSubstr("No negotiation is under way"));
   EXPECT_EQ(Sts().Requests().size(), 2U);
 }
 
@@ -63,17 +65,29 @@ TEST_F(NegotiationFaultsTest, AnEmptyContextIdStartsTheContextAnew) {
   EXPECT_EQ(Legs().at(1).ordinal, 1U);
 }
 
-TEST_F(NegotiationFaultsTest, AnEmptyLegOfTheServiceRestartsTheHandler) {
+TEST_F(NegotiationFaultsTest, AnEmptyLegInTheMiddleIsNoAnswer) {
+  for (const bool omit : {false, true}) {
+    Sts().ClearRequests();
+    DevSts::LegMisbehavior leg;
+    leg.omitLeg = omit;
+    if (!omit) {
+      leg.leg = "";
+    }
+    MisbehaveOnce(leg);
+    EXPECT_EQ(MessageOf<SsoException>(LogIn), "Unexpected XML format");
+    EXPECT_EQ(Sts().Requests().size(), 1U);
+  }
+}
+
+TEST_F(NegotiationFaultsTest, AnEmptyLegBesideTheTokenEndsTheLogin) {
+  Sts().SetNegotiationScript(kOneLeg);
   DevSts::LegMisbehavior leg;
   leg.leg = "";
   MisbehaveOnce(leg);
-  // An empty leg is how a negotiation begins: the handler's first leg comes twice, the service
-  // wants its second one.
-  EXPECT_THROW(LogIn(), SsoException);
-  const auto legs = Legs();
-  ASSERT_EQ(legs.size(), 2U);
-  EXPECT_FALSE(legs[1].octets.empty());
-  EXPECT_EQ(Sts().OpenNegotiations(), 0U);
+  const auto handler = Alice();
+  EXPECT_NE(Service()->AcquireTokenByGSS(TenMinutes(), *handler), nullptr);
+  // Nothing of Kerberos has spoken for the service.
+  EXPECT_FALSE(handler->IsEstablished());
 }
 
 TEST_F(NegotiationFaultsTest, ALateFailureIsTheServicesFault) {
@@ -151,7 +165,10 @@ class OddHandler final : public NegotiationHandler {
 };
 
 TEST_F(NegotiationFaultsTest, WhatTheHandlerThrowsReachesTheCallerUnchanged) {
-  for (const int call : {1, 2, 3}) {
+  // With one leg, the second call comes after the last leg of the service.
+  for (const auto& [script, call] :
+       {std::pair{TwoLegs(), 1}, std::pair{TwoLegs(), 2}, std::pair{kOneLeg, 2}}) {
+    Sts().SetNegotiationScript(script);
     Sts().ClearRequests();
     OddHandler handler(call);
     handler.legs_ = Alice();
@@ -161,7 +178,6 @@ TEST_F(NegotiationFaultsTest, WhatTheHandlerThrowsReachesTheCallerUnchanged) {
     } catch (const HandlersOwn& thrown) {
       EXPECT_EQ(thrown.value, call);
     }
-    // The third call comes after the last leg of the service.
     EXPECT_EQ(Sts().Requests().size(), static_cast<std::size_t>(call - 1));
   }
 }
