@@ -2,19 +2,12 @@
 
 #include <ssoclient/exceptions.h>
 
-#include <string_view>
-
 #include "gss_handle.h"
+#include "plain_text.h"
 
 namespace SsoClient {
 
 namespace {
-
-// Some texts end in blanks and a NUL.
-std::string_view Trimmed(std::string_view text) {
-  const auto last = text.find_last_not_of(std::string_view(" \n\0", 3));
-  return text.substr(0, last == std::string_view::npos ? 0 : last + 1);
-}
 
 std::string TextsOf(OM_uint32 code, int type) {
   std::string texts;
@@ -27,7 +20,7 @@ std::string TextsOf(OM_uint32 code, int type) {
       break;
     }
     texts += texts.empty() ? "" : ", ";
-    texts += Trimmed({static_cast<const char*>(text.Get().value), text.Get().length});
+    texts += PlainText({static_cast<const char*>(text.Get().value), text.Get().length});
   } while (next != 0);
   return texts;
 }

@@ -3,6 +3,7 @@
 #include <ssoclient/exceptions.h>
 
 #include "krb5_handles.h"
+#include "plain_text.h"
 
 namespace SsoClient {
 
@@ -39,7 +40,7 @@ class KeytabReader {
       return;
     }
     const char* text = krb5_get_error_message(context_.get(), code);
-    const std::string message = Failure() + ": " + text + ".";
+    const std::string message = Failure() + ": " + PlainText(text) + ".";
     krb5_free_error_message(context_.get(), text);
     throw SsoException(message);
   }

@@ -5,6 +5,7 @@
 
 #include <chrono>
 #include <filesystem>
+#include <fstream>
 #include <future>
 #include <thread>
 
@@ -12,6 +13,7 @@
 #include "init_sec_context_script.h"
 #include "realm_fixture.h"
 #include "support/thrown_message.h"
+#include "talkative_kdc.h"
 
 namespace SsoClient {
 namespace {
@@ -54,8 +56,13 @@ class GssapiNegotiationHandlerImplTest : public Testing::RealmFixture {
     return GssAcceptor(serviceKeytab).Accept(*handler.Negotiate({}));
   }
 
+  // On a thread of its own: the libraries keep the texts of earlier failures for a thread.
   static std::string Failure(GssapiNegotiationHandler& handler, const Leg& leg = {}) {
-    return ThrownMessage<SsoException>([&] { handler.Negotiate(leg); });
+    std::string message;
+    std::thread([&] {
+      message = ThrownMessage<SsoException>([&] { handler.Negotiate(leg); });
+    }).join();
+    return message;
   }
 
   // The handler has forgotten the negotiation, and serves another.
@@ -231,9 +238,53 @@ TEST_F(GssapiNegotiationHandlerImplTest, TellsThatTheServiceLacksItsKey) {
   GssAcceptor acceptor(machineKeytab);
   const Leg refusal = acceptor.Accept(*handler.Negotiate({}));
   EXPECT_THAT(acceptor.error, HasSubstr("not found in keytab"));
-  EXPECT_THAT(Failure(handler, refusal),
-              HasSubstr("Request ticket server HTTP/sts.example@EXAMPLE.COM not found in keytab"));
+  EXPECT_EQ(Failure(handler, refusal), Failed("The ticket isn't for us"));
   ExpectServesAgain(handler);
+}
+
+// One element of DER (X.690) with a content of less than 256 bytes.
+Leg Element(unsigned char tag, const Leg& content) {
+  EXPECT_LT(content.size(), 0x100U);
+  Leg whole{tag};
+  if (content.size() >= 0x80) {
+    whole.push_back(0x81);
+  }
+  whole.push_back(static_cast<unsigned char>(content.size()));
+  whole.insert(whole.end(), content.begin(), content.end());
+  return whole;
+}
+
+// A service's refusal, a KRB-ERROR in the frames of RFC 4121, section 4.1, and of RFC 4178.
+Leg RefusalWith(const std::string& text) {
+  Leg token{0x06, 0x09, 0x2a, 0x86, 0x48, 0x86, 0xf7, 0x12, 0x01, 0x02, 0x02, 0x03, 0x00};
+  const std::string error = Testing::KerberosError(text);
+  token.insert(token.end(), error.begin(), error.end());
+  Leg fields{0xa0, 0x03, 0x0a, 0x01, 0x01};
+  const Leg response = Element(0xa2, Element(0x04, Element(0x60, token)));
+  fields.insert(fields.end(), response.begin(), response.end());
+  return Element(0xa1, Element(0x30, fields));
+}
+
+TEST_F(GssapiNegotiationHandlerImplTest, DoesNotRepeatWhatAServiceSaysOfItsRefusal) {
+  GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
+  handler.Negotiate({});
+  EXPECT_EQ(Failure(handler, RefusalWith("no\r\nline")), Failed("Generic error (see e-text)"));
+  ExpectServesAgain(handler);
+}
+
+TEST_F(GssapiNegotiationHandlerImplTest, TellsInOneLineWhatAKdcSaysOfItsRefusal) {
+  GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
+  realm->StopKdc();
+  {
+    const Testing::TalkativeKdc kdc("no\r\nline \x1b[0m");
+    std::ofstream(realm->ConfigPath())
+        << "[libdefaults]\n default_realm = EXAMPLE.COM\n dns_canonicalize_hostname = false\n"
+           " udp_preference_limit = 1\n[realms]\n EXAMPLE.COM = {\n  kdc = 127.0.0.1:"
+        << kdc.Port() << "\n }\n";
+    EXPECT_EQ(Failure(handler), Failed("KDC returned error string: no??line ?[0m"));
+  }
+  realm->SetClock(0s);
+  ExpectLogin(handler);
 }
 
 TEST_F(GssapiNegotiationHandlerImplTest, RefusesTheProofOfAnotherNegotiation) {

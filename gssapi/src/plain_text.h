@@ -1,0 +1,15 @@
+#ifndef SSOCLIENT_GSSAPI_PLAIN_TEXT_H
+#define SSOCLIENT_GSSAPI_PLAIN_TEXT_H
+
+#include <string>
+#include <string_view>
+
+namespace SsoClient {
+
+/// A text of the libraries in the form for a message: in one line, without the blanks and NULs that
+/// some end in, and cut after 500 bytes. Parts of it may come from a service or a KDC.
+std::string PlainText(std::string_view text);
+
+}  // namespace SsoClient
+
+#endif

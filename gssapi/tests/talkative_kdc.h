@@ -1,0 +1,33 @@
+#ifndef SSOCLIENT_GSSAPI_TESTS_TALKATIVE_KDC_H
+#define SSOCLIENT_GSSAPI_TESTS_TALKATIVE_KDC_H
+
+#include <string>
+#include <thread>
+
+namespace SsoClient::Testing {
+
+/// A KDC on loopback that answers every request with an error (RFC 4120, section 5.9.1) that has a
+/// text of its own.
+class TalkativeKdc {
+ public:
+  explicit TalkativeKdc(std::string text);
+  TalkativeKdc(const TalkativeKdc&) = delete;
+  TalkativeKdc& operator=(const TalkativeKdc&) = delete;
+  ~TalkativeKdc();
+
+  unsigned short Port() const;
+
+ private:
+  void Serve() const;
+
+  std::string text_;
+  int listener_;
+  std::thread thread_;
+};
+
+/// A KRB-ERROR with the code KRB_ERR_GENERIC.
+std::string KerberosError(std::string text);
+
+}  // namespace SsoClient::Testing
+
+#endif
