@@ -11,7 +11,6 @@ namespace DevSts::Testing {
 namespace {
 
 using testing::AllOf;
-using testing::EndsWith;
 using testing::HasSubstr;
 using testing::Not;
 using testing::StartsWith;
@@ -123,6 +122,17 @@ TEST_F(NegotiationRulesTest, DoesNotBeginTwiceInOneContext) {
   ExpectFault(intruder.SendFirst(gss.Step()), "wst:InvalidRequest",
               "The Context is in use: " + login.client.context);
   EXPECT_TRUE(HoldsToken(login.client.SendNext(login.last)));
+}
+
+TEST_F(NegotiationRulesTest, TakesOneLegOfANegotiationAtATime) {
+  const auto server = TwoLegServer();
+  Begun login(*server, alice, kService);
+  std::string meanwhile;
+  AssertionOptions shape;
+  shape.beforeSigning = [&](std::string&) { meanwhile = login.client.SendNext(login.last); };
+  server->SetAssertionOptions(shape);
+  EXPECT_TRUE(HoldsToken(login.client.SendNext(login.last)));
+  ExpectFault(meanwhile, "wst:InvalidRequest", "The negotiation is busy with another leg");
 }
 
 TEST_F(NegotiationRulesTest, ForgetsTheOldestWhenThereAreTooMany) {
