@@ -41,6 +41,14 @@ struct Begun {
   std::string last;
 };
 
+// The envelope with a Timestamp that is over.
+std::string Stale(std::string envelope) {
+  const std::string end = "</wsu:Timestamp>";
+  const std::size_t from = envelope.find("<wsu:Timestamp");
+  const std::size_t size = envelope.find(end) + end.size() - from;
+  return envelope.replace(from, size, Timestamp(-1200, -600));
+}
+
 Misbehavior Wrong(const LegMisbehavior& leg) {
   Misbehavior misbehavior;
   misbehavior.leg = leg;
@@ -165,8 +173,7 @@ TEST_F(NegotiationRulesTest, HoldsFirstLegsToTheRulesOfRequests) {
     const char* reason;
   };
   const std::vector<Case> cases = {
-      {Replaced(good, Timestamp(), Timestamp(-1200, -600)), "wsu:MessageExpired",
-       "The Timestamp has expired"},
+      {Stale(good), "wsu:MessageExpired", "The Timestamp has expired"},
       {Replaced(good, " Context=\"urn:uuid:rules\"", ""), "wst:InvalidRequest",
        "Missing attribute Context on RequestSecurityToken"},
       {Replaced(good, "urn:uuid:rules", ""), "wst:InvalidRequest",
@@ -220,8 +227,7 @@ TEST_F(NegotiationRulesTest, HoldsLaterLegsToTheRulesAndWaitsForARightOne) {
     const char* reason;
   };
   const std::vector<Case> cases = {
-      {Replaced(good, Timestamp(), Timestamp(-1200, -600)), "wsu:MessageExpired",
-       "The Timestamp has expired"},
+      {Stale(good), "wsu:MessageExpired", "The Timestamp has expired"},
       {Envelope(UsernameToken("alice@EXAMPLE.COM", "secret"), body), "wsse:InvalidSecurity",
        "Neither login nor signature is expected where a negotiation goes on"},
       {Sign(ByCertificate(holder, body), holder), "wsse:InvalidSecurity",
