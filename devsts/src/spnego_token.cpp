@@ -1,6 +1,8 @@
 #include "spnego_token.h"
 
+#include <algorithm>
 #include <cstddef>
+#include <iterator>
 #include <optional>
 #include <span>
 
@@ -77,21 +79,25 @@ View ResponseFields(const Octets& response) {
   return ContentOf(ContentOf(response, Field(1)), kSequence);
 }
 
-Octets Wrapped(unsigned char tag, const Octets& content) {
-  Octets octets{tag};
+Octets Wrapped(unsigned char tag, View content) {
   const std::size_t size = content.size();
+  Octets octets;
+  octets.reserve(size + 4);
+  octets.push_back(tag);
   if (size >= 0x100) {
-    octets.insert(octets.end(), {0x82, static_cast<unsigned char>(size >> 8U)});
+    octets.push_back(0x82);
+    octets.push_back(static_cast<unsigned char>(size >> 8U));
   } else if (size >= 0x80) {
     octets.push_back(0x81);
   }
   octets.push_back(static_cast<unsigned char>(size));
-  octets.insert(octets.end(), content.begin(), content.end());
+  std::copy(content.begin(), content.end(), std::back_inserter(octets));
   return octets;
 }
 
 Octets StateField(NegState state) {
-  return Wrapped(Field(0), Wrapped(kEnumerated, {static_cast<unsigned char>(state)}));
+  const auto value = static_cast<unsigned char>(state);
+  return Wrapped(Field(0), Wrapped(kEnumerated, View(&value, 1)));
 }
 
 Octets Response(const Octets& fields) {

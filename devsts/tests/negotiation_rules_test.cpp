@@ -11,7 +11,6 @@ namespace DevSts::Testing {
 namespace {
 
 using testing::AllOf;
-using testing::EndsWith;
 using testing::HasSubstr;
 using testing::Not;
 using testing::StartsWith;
@@ -41,6 +40,14 @@ struct Begun {
   std::string first;
   std::string last;
 };
+
+// The envelope with a Timestamp that is over.
+std::string Stale(std::string envelope) {
+  const std::string end = "</wsu:Timestamp>";
+  const std::size_t from = envelope.find("<wsu:Timestamp");
+  const std::size_t size = envelope.find(end) + end.size() - from;
+  return envelope.replace(from, size, Timestamp(-1200, -600));
+}
 
 Misbehavior Wrong(const LegMisbehavior& leg) {
   Misbehavior misbehavior;
@@ -125,6 +132,17 @@ TEST_F(NegotiationRulesTest, DoesNotBeginTwiceInOneContext) {
   EXPECT_TRUE(HoldsToken(login.client.SendNext(login.last)));
 }
 
+TEST_F(NegotiationRulesTest, TakesOneLegOfANegotiationAtATime) {
+  const auto server = TwoLegServer();
+  Begun login(*server, alice, kService);
+  std::string meanwhile;
+  AssertionOptions shape;
+  shape.beforeSigning = [&](std::string&) { meanwhile = login.client.SendNext(login.last); };
+  server->SetAssertionOptions(shape);
+  EXPECT_TRUE(HoldsToken(login.client.SendNext(login.last)));
+  ExpectFault(meanwhile, "wst:InvalidRequest", "The negotiation is busy with another leg");
+}
+
 TEST_F(NegotiationRulesTest, ForgetsTheOldestWhenThereAreTooMany) {
   ServerOptions options = Options();
   options.negotiation.limit = 2;
@@ -155,8 +173,7 @@ TEST_F(NegotiationRulesTest, HoldsFirstLegsToTheRulesOfRequests) {
     const char* reason;
   };
   const std::vector<Case> cases = {
-      {Replaced(good, Timestamp(), Timestamp(-1200, -600)), "wsu:MessageExpired",
-       "The Timestamp has expired"},
+      {Stale(good), "wsu:MessageExpired", "The Timestamp has expired"},
       {Replaced(good, " Context=\"urn:uuid:rules\"", ""), "wst:InvalidRequest",
        "Missing attribute Context on RequestSecurityToken"},
       {Replaced(good, "urn:uuid:rules", ""), "wst:InvalidRequest",
@@ -210,8 +227,7 @@ TEST_F(NegotiationRulesTest, HoldsLaterLegsToTheRulesAndWaitsForARightOne) {
     const char* reason;
   };
   const std::vector<Case> cases = {
-      {Replaced(good, Timestamp(), Timestamp(-1200, -600)), "wsu:MessageExpired",
-       "The Timestamp has expired"},
+      {Stale(good), "wsu:MessageExpired", "The Timestamp has expired"},
       {Envelope(UsernameToken("alice@EXAMPLE.COM", "secret"), body), "wsse:InvalidSecurity",
        "Neither login nor signature is expected where a negotiation goes on"},
       {Sign(ByCertificate(holder, body), holder), "wsse:InvalidSecurity",

@@ -16,7 +16,6 @@ namespace DevSts::Testing {
 namespace {
 
 using testing::AllOf;
-using testing::EndsWith;
 using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
@@ -26,6 +25,9 @@ constexpr char kGranted[] = "<wst:RequestSecurityTokenResponseCollection>";
 constexpr char kAskedOn[] = "/200512\"><wst:RequestSecurityTokenResponse Context=";
 // NegTokenResp with the state accept-incomplete and nothing else.
 constexpr char kGoOn[] = "\xa1\x07\x30\x05\xa0\x03\x0a\x01\x01";
+
+// The object identifier of Kerberos (RFC 4121, section 4.1).
+constexpr char kKerberos[] = "\x06\x09\x2a\x86\x48\x86\xf7\x12\x01\x02\x02";
 
 class NegotiationTest : public NegotiationFixture {};
 
@@ -305,15 +307,18 @@ TEST_F(NegotiationTest, RefusesLegsThatAreNone) {
   EXPECT_EQ(server.OpenNegotiations(), 0U);
 }
 
-// The octets of Kerberos alone stand behind its object identifier in the first leg.
+// The list of mechanisms names Kerberos, and then Kerberos' own message begins with its name.
 TEST_F(NegotiationTest, RefusesKerberosOutsideSpnego) {
   const Server server(Options());
   NegotiationClient client(server);
   GssClient gss(alice, kService);
   const std::string leg = gss.Step();
-  const std::size_t token = leg.find('\x60', 1);
-  ASSERT_NE(token, std::string::npos);
-  ExpectFault(client.SendFirst(leg.substr(token)), "wst:FailedAuthentication",
+  const std::size_t listed = leg.find(kKerberos);
+  const std::size_t named = leg.find(kKerberos, listed + 1);
+  ASSERT_NE(named, std::string::npos);
+  const std::string token = leg.substr(named - 4);  // with the tag and three octets of length
+  ASSERT_EQ(token[0], '\x60');
+  ExpectFault(client.SendFirst(token), "wst:FailedAuthentication",
               "The negotiation failed: No credentials were supplied, or the credentials were "
               "unavailable or inaccessible");
 }
