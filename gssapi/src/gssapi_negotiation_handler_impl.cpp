@@ -15,6 +15,9 @@ using Leg = std::vector<unsigned char>;
 // Integrity lets SPNEGO protect the choice of the mechanism (RFC 4178, section 5).
 constexpr OM_uint32 kFlags = GSS_C_MUTUAL_FLAG | GSS_C_INTEG_FLAG;
 
+// Kerberos takes three at most. A service that asks on and on would hold its caller forever.
+constexpr int kMaxLegs = 100;
+
 // One thread at a time: two would tear the negotiation apart.
 class Use {
  public:
@@ -57,11 +60,12 @@ std::shared_ptr<const Leg> GssapiNegotiationHandlerImpl::Negotiate(const Leg& se
         "The negotiation handler is given a leg of the service's, but no negotiation is under "
         "way.");
   }
-  // The service may send a leg even when all is said.
-  if (state_ == State::kEstablished) {
-    return std::make_shared<const Leg>();
-  }
   try {
+    CountLeg();
+    // The service may send a leg even when all is said.
+    if (state_ == State::kEstablished) {
+      return std::make_shared<const Leg>();
+    }
     return std::make_shared<const Leg>(NextLeg(serverLeg));
   } catch (...) {
     End(State::kIdle);
@@ -77,6 +81,18 @@ void GssapiNegotiationHandlerImpl::Begin() {
   End(State::kIdle);
   AcquireCredentials(source_, credentials_);
   state_ = State::kUnderWay;
+  legs_ = 0;
+}
+
+void GssapiNegotiationHandlerImpl::CountLeg() {
+  if (++legs_ > kMaxLegs) {
+    throw SsoException(Attempt() + ": the service asks for more than " + std::to_string(kMaxLegs) +
+                       " legs.");
+  }
+}
+
+std::string GssapiNegotiationHandlerImpl::Attempt() const {
+  return "The login at `" + targetService_ + "' failed";
 }
 
 // No message will be protected with the context's keys: they need not be kept.
@@ -87,7 +103,7 @@ void GssapiNegotiationHandlerImpl::End(State state) noexcept {
 }
 
 Leg GssapiNegotiationHandlerImpl::NextLeg(const Leg& serverLeg) {
-  const std::string attempt = "The login at `" + targetService_ + "' failed";
+  const std::string attempt = Attempt();
   gss_buffer_desc input{serverLeg.size(), const_cast<unsigned char*>(serverLeg.data())};
   GssBuffer output;
   OM_uint32 granted = 0;

@@ -29,7 +29,9 @@ class GssapiNegotiationHandlerImpl final : public GssapiNegotiationHandler {
   enum class State { kIdle, kUnderWay, kEstablished };
 
   void Begin();
+  void CountLeg();
   void End(State state) noexcept;
+  std::string Attempt() const;  // what the message of a failure begins with
   std::vector<unsigned char> NextLeg(const std::vector<unsigned char>& serverLeg);
 
   const std::string targetService_;
@@ -40,6 +42,7 @@ class GssapiNegotiationHandlerImpl final : public GssapiNegotiationHandler {
   GssCredential credentials_;
   GssContext context_;
   State state_ = State::kIdle;
+  int legs_ = 0;  // since the negotiation began
   std::atomic_flag isInUse_ = ATOMIC_FLAG_INIT;
 };
 

@@ -101,6 +101,17 @@ TEST_F(GssapiNegotiationHandlerImplTest, HasNothingToSayAfterTheEnd) {
   }
 }
 
+TEST_F(GssapiNegotiationHandlerImplTest, EndsWithAServiceThatAsksOnAndOn) {
+  GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
+  const Leg answer = AnswerTo(handler);
+  for (int legs = 1; legs < 100; ++legs) {
+    handler.Negotiate(answer);
+  }
+  EXPECT_EQ(Failure(handler, answer),
+            "The login at `HTTP@sts.example' failed: the service asks for more than 100 legs.");
+  ExpectServesAgain(handler);
+}
+
 TEST_F(GssapiNegotiationHandlerImplTest, BeginsAnewWithAnEmptyLegInTheMiddle) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   const Leg answerToTheFirst = AnswerTo(handler);

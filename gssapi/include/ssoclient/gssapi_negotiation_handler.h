@@ -39,11 +39,10 @@ struct GssapiNegotiationConfig {
 ///
 /// `Negotiate` throws
 /// - `SsoException`, with the texts of the GSSAPI library, when there are no credentials, the realm
-///   does not answer or refuses, or the service's leg is broken or proves no identity; the
-///   negotiation is then forgotten;
-/// - `Tarnik::InvalidStateException` when the service's leg is not empty and no negotiation is
-/// under
-///   way, or when another thread is in the same call.
+///   does not answer or refuses, or the service's leg is broken or proves no identity, and also
+///   when the service asks for more than 100 legs; the negotiation is then forgotten;
+/// - `Tarnik::InvalidStateException` when no negotiation is under way and the service's leg is not
+///   empty, or when another thread is in the same call.
 ///
 /// It blocks while the Kerberos library asks the realm, and no time-out of the service's holds for
 /// that: MIT Kerberos 1.20 gives a KDC that is not there up at once, and one that says nothing
