@@ -383,6 +383,7 @@ TEST(ParseNegotiationResponseTest, WhatIsMissingIsToldInTheOrderOfReading) {
 TEST(ParseNegotiationResponseTest, AnIntermediateLegIsNeeded) {
   for (const std::string exchange :
        {"", "<wst:BinaryExchange/>", "<wst:BinaryExchange></wst:BinaryExchange>",
+        "<wst:BinaryExchange> \n</wst:BinaryExchange>",
         "<wst:BinaryExchange><!-- c -->AP8Q</wst:BinaryExchange>"}) {
     EXPECT_EQ(Failure([&] { ParseNegotiation(LegAnswer(exchange)); }), kFormat) << exchange;
   }
