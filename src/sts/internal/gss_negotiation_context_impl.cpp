@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "sts/negotiation_leg.h"
+#include "sts/secret_text.h"
 
 namespace SsoClient::InternalApi {
 
@@ -24,8 +25,10 @@ GssNegotiationResult GssNegotiationContextImpl::Negotiate(
   contextId_.swap(answer.contextId);
   GssNegotiationResult result;
   result.outputLeg = std::make_shared<std::vector<unsigned char>>(std::move(answer.leg));
-  if (!answer.token.empty()) {
-    result.token = CreateSamlToken(answer.token, keyInfoResolver_.get());
+  SecretText assertion;
+  assertion.text.swap(answer.token);
+  if (!assertion.text.empty()) {
+    result.token = CreateSamlToken(assertion.text, keyInfoResolver_.get());
   }
   return result;
 }
