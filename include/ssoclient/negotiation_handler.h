@@ -13,7 +13,8 @@ class NegotiationHandler {
   /// Takes the service's last leg, empty on the first call, and returns the next one to send, which
   /// may be empty but not null. When the service ends the negotiation with a leg of its own, that
   /// one is handed over, too, though nothing is sent after it. What it throws passes through the
-  /// operation unchanged.
+  /// operation unchanged; from an asynchronous one only a `Tarnik::Exception` reaches the callback,
+  /// and anything else ends the process.
   virtual std::shared_ptr<const std::vector<unsigned char>> Negotiate(
       const std::vector<unsigned char>& serverLeg) = 0;
 

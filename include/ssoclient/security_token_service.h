@@ -41,10 +41,12 @@ namespace SsoClient {
 /// A token that an operation returns is null only if the service answers with an empty token text.
 ///
 /// Each asynchronous operation returns at once and reports to its callback, which must not be
-/// empty (`Tarnik::InvalidArgumentException`). Every failure of the operation itself goes to the
-/// callback. Arguments are copied, except tokens and negotiation handlers, which are taken by
-/// reference: the caller keeps them alive until the callback has run. The service may be released
-/// before.
+/// empty (`Tarnik::InvalidArgumentException`). What the operation throws goes to the callback if it
+/// is a `Tarnik::Exception`, as every failure listed above is. Anything else, such as a
+/// `std::exception` of a negotiation handler of the caller's own, leaves the worker thread and so
+/// ends the process. Arguments are copied, except tokens and negotiation handlers, which are taken
+/// by reference: the caller keeps them alive until the callback has run. The service may be
+/// released before.
 class SecurityTokenService {
  public:
   /// Receives a token and null, or null and the exception, which is valid only during the call.

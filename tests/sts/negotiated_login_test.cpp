@@ -250,6 +250,43 @@ TEST(NegotiatedLoginAsyncTest, TheTwinReportsTokenAndErrors) {
       Tarnik::InvalidArgumentException);
 }
 
+// Fails in its first leg.
+template <class Error>
+class FailingHandler final : public NegotiationHandler {
+ public:
+  LegHandle Negotiate(const Leg&) override { throw Error("from the handler"); }
+};
+
+class HandlersOwnException : public SsoException {
+ public:
+  using SsoException::SsoException;
+};
+
+TEST(NegotiatedLoginAsyncTest, WhatTheHandlerThrowsReachesTheCallbackUnchanged) {
+  const Sts sts({LastLegAnswer()});
+  FailingHandler<HandlersOwnException> handler;
+  Testing::AsyncCall call;
+  sts.Service()->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
+  const auto report = call.Wait();
+  EXPECT_EQ(report.token, nullptr);
+  EXPECT_EQ(report.errorType, typeid(HandlersOwnException).name());
+  EXPECT_EQ(report.message, "from the handler");
+}
+
+TEST(NegotiatedLoginAsyncDeathTest, AnotherKindOfExceptionEndsTheProcess) {
+  testing::GTEST_FLAG(death_test_style) = "threadsafe";
+  EXPECT_DEATH(
+      {
+        FailingHandler<std::runtime_error> handler;
+        Testing::AsyncCall call;
+        Sts({LastLegAnswer()})
+            .Service()
+            ->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
+        call.Wait();
+      },
+      "from the handler");
+}
+
 // Waits within its first leg.
 class WaitingHandler final : public NegotiationHandler {
  public:
