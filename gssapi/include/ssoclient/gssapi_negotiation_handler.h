@@ -46,7 +46,7 @@ struct GssapiNegotiationConfig {
 ///
 /// It blocks while the Kerberos library asks the realm, and no time-out of the service's holds for
 /// that: MIT Kerberos 1.20 gives a KDC that is not there up at once, and one that says nothing
-/// after 25 seconds (two such after 40, four after 66). A handler is used by one thread at a time,
+/// after 27 seconds (two such after 40, four after 66). A handler is used by one thread at a time,
 /// not necessarily by the one that made it; different handlers are independent. Tickets are never
 /// delegated to the service.
 class GssapiNegotiationHandler : public NegotiationHandler {
