@@ -16,9 +16,10 @@ endfunction()
 # ssoclient_add_test_runs(TARGET SHARDS): runs a GoogleTest program as SHARDS processes, which CTest may run side by
 # side. A process a test would spend most of its time on starting sanitizers.
 function(ssoclient_add_test_runs target shards)
-  # Sanitizers look into the libraries; optimising the tests as well costs more time than it saves.
+  # Sanitizers look into the libraries; optimising the tests as well costs more time than it saves, and so does looking
+  # for undefined behaviour in them.
   if(SSOCLIENT_SANITIZER)
-    target_compile_options(${target} PRIVATE -O0)
+    target_compile_options(${target} PRIVATE -O0 -fno-sanitize=undefined)
   endif()
   math(EXPR last "${shards} - 1")
   foreach(index RANGE ${last})

@@ -134,10 +134,10 @@ NegotiationResponse ParseNegotiationBody(const ElementNode& body) {
   }
   NegotiationResponse negotiation;
   negotiation.contextId = *contextId;
-  DecodeLeg(ElementText(response->FirstChildElement("BinaryExchange")), negotiation.leg);
-  // White space is no leg either. A handler takes an empty one for the start of a negotiation: it
-  // would begin again and again.
-  if (negotiation.leg.empty() && !isFinal) {
+  const auto leg = ElementText(response->FirstChildElement("BinaryExchange"));
+  if (!leg.empty()) {
+    DecodeLeg(leg, negotiation.leg);
+  } else if (!isFinal) {
     ThrowUnexpectedFormat();
   }
   if (isFinal) {
