@@ -1,6 +1,6 @@
 # PkgConfig::GSSAPI: MIT's GSSAPI library with the Kerberos library below it.
-find_package(PkgConfig REQUIRED)
-pkg_check_modules(GSSAPI IMPORTED_TARGET krb5-gssapi krb5)
+include(KerberosLibrary)
+ssoclient_find_kerberos(GSSAPI krb5-gssapi krb5)
 if(NOT GSSAPI_FOUND)
   message(FATAL_ERROR "krb5-gssapi is missing, which libssoclient-gssapi.so needs (Debian: libkrb5-dev). Install it, "
     "or leave that library out with -DSSOCLIENT_BUILD_GSSAPI=OFF.")
