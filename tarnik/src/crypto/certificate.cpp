@@ -6,9 +6,8 @@
 
 #include "crypto/certificate_cache.h"
 #include "crypto/certificate_impl.h"
+#include "crypto/load_file.h"
 #include "crypto/pem.h"
-#include "support/file.h"
-#include "support/sensitive_text.h"
 
 namespace Tarnik::Crypto {
 
@@ -45,9 +44,10 @@ std::vector<Ref<const Certificate>> CreateCertificatesFromPem(std::string_view p
 }
 
 std::vector<Ref<const Certificate>> LoadCertificates(const std::string& path) {
-  SensitiveText text;
-  ReadFile("certificate", path, text);
-  return CreateCertificatesFromPem(text.Text());
+  return LoadFile("certificate", path, {},
+                  [](std::string_view pem, const PassphraseCallback& /*passphrase*/) {
+                    return CreateCertificatesFromPem(pem);
+                  });
 }
 
 }  // namespace Tarnik::Crypto

@@ -3,11 +3,10 @@
 
 #include <climits>
 
+#include "crypto/load_file.h"
 #include "crypto/passphrase.h"
 #include "crypto/private_key_impl.h"
-#include "support/file.h"
 #include "support/openssl_error.h"
-#include "support/sensitive_text.h"
 
 namespace Tarnik::Crypto {
 namespace {
@@ -171,10 +170,12 @@ KeyAndCertificate CreateKeyAndCertificateFromPkcs12(const unsigned char* bytes, 
 
 KeyAndCertificate LoadKeyAndCertificate(const std::string& path,
                                         const PassphraseCallback& passphrase) {
-  SensitiveText text;
-  ReadFile("PKCS#12", path, text);
-  return CreateKeyAndCertificateFromPkcs12(
-      reinterpret_cast<const unsigned char*>(text.Text().data()), text.Size(), passphrase);
+  return LoadFile("PKCS#12", path, passphrase,
+                  [](std::string_view content, const PassphraseCallback& observed) {
+                    return CreateKeyAndCertificateFromPkcs12(
+                        reinterpret_cast<const unsigned char*>(content.data()), content.size(),
+                        observed);
+                  });
 }
 
 }  // namespace Tarnik::Crypto

@@ -6,13 +6,12 @@
 #include <optional>
 #include <utility>
 
+#include "crypto/load_file.h"
 #include "crypto/passphrase.h"
 #include "crypto/pem.h"
 #include "crypto/private_key_impl.h"
-#include "support/file.h"
 #include "support/openssl_error.h"
 #include "support/quote.h"
-#include "support/sensitive_text.h"
 
 namespace Tarnik::Crypto {
 namespace {
@@ -148,9 +147,7 @@ Ref<const PrivateKey> CreatePrivateKeyFromPem(std::string_view pem,
 
 Ref<const PrivateKey> LoadPrivateKey(const std::string& path,
                                      const PassphraseCallback& passphrase) {
-  SensitiveText text;
-  ReadFile("private key", path, text);
-  return CreatePrivateKeyFromPem(text.Text(), passphrase);
+  return LoadFile("private key", path, passphrase, CreatePrivateKeyFromPem);
 }
 
 }  // namespace Tarnik::Crypto

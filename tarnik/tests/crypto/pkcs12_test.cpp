@@ -244,5 +244,17 @@ TEST(Pkcs12, NamesTheFileThatCannotBeRead) {
   }
 }
 
+TEST(Pkcs12, NamesTheFileThatCannotBeUsed) {
+  const Testing::TemporaryFile file("nothing here");
+  try {
+    LoadKeyAndCertificate(file.Path(), [] { return std::string(kSecret); });
+    FAIL() << "loaded";
+  } catch (const CryptoException& error) {
+    EXPECT_EQ(error.Message().rfind("The PKCS#12 file '" + file.Path() + "' cannot be used: ", 0),
+              0U)
+        << error.Message();
+  }
+}
+
 }  // namespace
 }  // namespace Tarnik::Crypto
