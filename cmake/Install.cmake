@@ -21,6 +21,10 @@ function(ssoclient_install_package)
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"
     DESTINATION ${cmake_dir} COMPONENT ${PACKAGE_NAME})
 
+  # From where the file stands, for the prefix may be chosen when it is installed.
+  file(RELATIVE_PATH up "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
+  string(REGEX REPLACE "/$" "" up "${up}")
+  set(PACKAGE_PC_PREFIX "\${pcfiledir}/${up}")
   configure_file("${PROJECT_SOURCE_DIR}/cmake/package.pc.in"
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc" @ONLY)
   install(FILES "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc"
