@@ -6,9 +6,9 @@
 #include "sts/logger.h"
 #include "sts/negotiation_leg.h"
 #include "sts/pass_by_ref_helper.h"
-#include "sts/secret_text.h"
 #include "sts/sync_to_async_call.h"
 #include "token/default_clock_tolerance.h"
+#include "xml/secret_text.h"
 
 namespace SsoClient {
 
@@ -97,13 +97,13 @@ TokenHandle SecurityTokenServiceImpl::AcquireTokenByGSS(const TokenSpec& spec,
   const auto session = transport_->CreateSession();
   const NegotiationParts parts{*requestBuilder_, *session, *responseHandler_};
   NegotiationResponse answer;
+  SecretText assertion;
   do {
     const auto leg = NextLeg(handler, answer.leg);
     answer = SendNegotiationLeg(parts, spec, answer.contextId, *leg);
+    assertion.text.swap(answer.token);
     CheckContextId(answer);
-  } while (answer.token.empty());
-  SecretText assertion;
-  assertion.text.swap(answer.token);
+  } while (assertion.text.empty());
   HandOverLastLeg(handler, answer.leg);
   return MakeToken(assertion.text);
 }
