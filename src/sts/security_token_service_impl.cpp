@@ -47,6 +47,17 @@ std::shared_ptr<const std::vector<unsigned char>> NextLeg(
   return leg;
 }
 
+// No mechanism takes more than a few. A service may answer on and on without a byte of its own, and
+// a handler then begin anew each time, so that nobody else would ever end the loop.
+constexpr int kMaxLegs = 1000;
+
+void CountLeg(int& legs) {
+  if (++legs > kMaxLegs) {
+    throw CommunicationException("The service asks for more than " + std::to_string(kMaxLegs) +
+                                 " legs of SPNego.");
+  }
+}
+
 void CheckContextId(const NegotiationResponse& answer) {
   if (answer.contextId.empty()) {
     throw CommunicationException(
@@ -98,7 +109,9 @@ TokenHandle SecurityTokenServiceImpl::AcquireTokenByGSS(const TokenSpec& spec,
   const NegotiationParts parts{*requestBuilder_, *session, *responseHandler_};
   NegotiationResponse answer;
   SecretText assertion;
+  int legs = 0;
   do {
+    CountLeg(legs);
     const auto leg = NextLeg(handler, answer.leg);
     answer = SendNegotiationLeg(parts, spec, answer.contextId, *leg);
     assertion.text.swap(answer.token);

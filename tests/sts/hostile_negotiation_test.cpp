@@ -162,6 +162,21 @@ TEST_P(HostileNegotiationTest, ALegOfMegabytesReachesTheHandlerWhole) {
   EXPECT_TRUE(handler_.received[1] == leg);
 }
 
+TEST(HostileNegotiationLoopTest, EndsWhenTheServiceNeverDoes) {
+  for (const auto* leg : {" ", "AQID"}) {
+    const auto transport = std::make_shared<FakeTransport>(LegAnswer("c", Exchange(leg)));
+    const SecurityTokenServiceImpl service(std::make_shared<RequestBuilderImpl>(boost::none),
+                                           transport, std::make_shared<ResponseHandlerImpl>(),
+                                           std::make_shared<Testing::FakeTokenFactory>());
+    ListeningHandler handler;
+    EXPECT_EQ(ThrownMessage<CommunicationException>(
+                  [&] { service.AcquireTokenByGSS(OneHour(), handler); }),
+              "The service asks for more than 1000 legs of SPNego.");
+    EXPECT_EQ(transport->bodies.size(), 1000U);
+    EXPECT_EQ(handler.received.size(), 1000U);
+  }
+}
+
 TEST_P(HostileNegotiationTest, AFaultBesideATokenIsAFault) {
   const std::string fault = Testing::Fault("wst:FailedAuthentication", "no");
   const std::string token =
