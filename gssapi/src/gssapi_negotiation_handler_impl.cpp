@@ -2,6 +2,9 @@
 
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
+#include <tarnik/text/string_util.h>
+
+#include <utility>
 
 #include "gss_error.h"
 #include "gss_name.h"
@@ -39,6 +42,14 @@ Leg BytesOf(const GssBuffer& buffer) {
   return {bytes, bytes + buffer.Get().length};
 }
 
+// A leg that logs its maker in does not stay in memory when its last owner lets go of it.
+std::shared_ptr<const Leg> HandOut(Leg leg) {
+  return {new Leg(std::move(leg)), [](Leg* handedOut) {
+            Tarnik::StringUtil::Cleanse(*handedOut);
+            delete handedOut;
+          }};
+}
+
 }  // namespace
 
 GssapiNegotiationHandlerImpl::GssapiNegotiationHandlerImpl(const GssapiNegotiationConfig& config)
@@ -66,7 +77,7 @@ std::shared_ptr<const Leg> GssapiNegotiationHandlerImpl::Negotiate(const Leg& se
     if (state_ == State::kEstablished) {
       return std::make_shared<const Leg>();
     }
-    return std::make_shared<const Leg>(NextLeg(serverLeg));
+    return HandOut(NextLeg(serverLeg));
   } catch (...) {
     End(State::kIdle);
     throw;

@@ -1,27 +1,81 @@
 #include "plain_text.h"
 
-#include <algorithm>
-
 namespace SsoClient {
 
 namespace {
 
 constexpr std::size_t kMaxLength = 500;
 
-bool IsControl(char c) {
+bool IsBetween(char c, unsigned char first, unsigned char last) {
   const auto byte = static_cast<unsigned char>(c);
-  return byte < 0x20 || byte == 0x7f;
+  return first <= byte && byte <= last;
+}
+
+std::size_t LengthBehind(char lead) {
+  if (IsBetween(lead, 0, 0x7f)) {
+    return 1;
+  }
+  if (IsBetween(lead, 0xc2, 0xdf)) {
+    return 2;
+  }
+  if (IsBetween(lead, 0xe0, 0xef)) {
+    return 3;
+  }
+  return IsBetween(lead, 0xf0, 0xf4) ? 4 : 0;
+}
+
+// What could be written in fewer bytes, stands for half of a pair, or lies beyond Unicode.
+bool IsForbidden(char lead, char second) {
+  return (lead == '\xe0' && IsBetween(second, 0x80, 0x9f)) ||
+         (lead == '\xed' && IsBetween(second, 0xa0, 0xbf)) ||
+         (lead == '\xf0' && IsBetween(second, 0x80, 0x8f)) ||
+         (lead == '\xf4' && IsBetween(second, 0x90, 0xbf));
+}
+
+// The character of UTF-8 (RFC 3629, section 4) that the text begins with; empty if there is none.
+std::string_view FirstCharacter(std::string_view text) {
+  const std::string_view character = text.substr(0, LengthBehind(text.front()));
+  if (character.size() < LengthBehind(text.front())) {
+    return {};
+  }
+  for (const char c : character.substr(character.empty() ? 0 : 1)) {
+    if (!IsBetween(c, 0x80, 0xbf)) {
+      return {};
+    }
+  }
+  const bool isLong = character.size() > 2;
+  return isLong && IsForbidden(character[0], character[1]) ? std::string_view() : character;
+}
+
+bool IsControl(std::string_view character) {
+  const char first = character.front();
+  const bool isOfC1 =
+      character.size() == 2 && first == '\xc2' && IsBetween(character[1], 0x80, 0x9f);
+  return IsBetween(first, 0, 0x1f) || first == '\x7f' || isOfC1;
+}
+
+bool IsDroppedAtTheEnd(char c) {
+  return c == ' ' || IsControl({&c, 1});
 }
 
 }  // namespace
 
 std::string PlainText(std::string_view text) {
-  while (!text.empty() && (text.back() == ' ' || IsControl(text.back()))) {
+  while (!text.empty() && IsDroppedAtTheEnd(text.back())) {
     text.remove_suffix(1);
   }
-  std::string plain(text.substr(0, kMaxLength));
-  std::replace_if(plain.begin(), plain.end(), IsControl, '?');
-  return text.size() > kMaxLength ? plain + "..." : plain;
+  std::string plain;
+  while (!text.empty()) {
+    const std::string_view character = FirstCharacter(text);
+    const bool isPlain = !character.empty() && !IsControl(character);
+    const std::string_view written = isPlain ? character : "?";
+    if (plain.size() + written.size() > kMaxLength) {
+      return plain + "...";
+    }
+    plain += written;
+    text.remove_prefix(character.empty() ? 1 : character.size());
+  }
+  return plain;
 }
 
 }  // namespace SsoClient

@@ -9,6 +9,7 @@
 #include <future>
 #include <thread>
 
+#include "calls/freed_memory.h"
 #include "expect_login.h"
 #include "init_sec_context_script.h"
 #include "realm_fixture.h"
@@ -306,6 +307,14 @@ TEST_F(GssapiNegotiationHandlerImplTest, RefusesTheProofOfAnotherNegotiation) {
   handler.Negotiate({});
   EXPECT_EQ(Failure(handler, proof), Failed("Mutual authentication failed"));
   ExpectServesAgain(handler);
+}
+
+TEST_F(GssapiNegotiationHandlerImplTest, LeavesNoLegInMemory) {
+  GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
+  auto leg = handler.Negotiate({});
+  const Testing::FreedMemory memory(std::string(leg->end() - 40, leg->end()));
+  leg = nullptr;
+  EXPECT_EQ(memory.Finds(), 0);
 }
 
 struct BadLeg {

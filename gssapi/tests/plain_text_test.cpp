@@ -19,9 +19,32 @@ TEST(PlainTextTest, StaysInOneLine) {
   EXPECT_EQ(PlainText(std::string_view("a\nb\x1b[1mc\0d\x7f!", 12)), "a?b?[1mc?d?!");
 }
 
+TEST(PlainTextTest, IsUtf8) {
+  for (const std::string kept : {"\xc2\xa0", "\xdf\xbf", "\xe0\xa0\x80", "\xed\x9f\xbf",
+                                 "\xee\x80\x80", "\xf0\x90\x80\x80", "\xf4\x8f\xbf\xbf"}) {
+    EXPECT_EQ(PlainText("a" + kept + "b"), "a" + kept + "b");
+    EXPECT_EQ(PlainText(kept), kept);
+    // What is left of it is not.
+    for (std::size_t size = 1; size < kept.size(); ++size) {
+      EXPECT_EQ(PlainText("a" + kept.substr(0, size) + "b"), "a" + std::string(size, '?') + "b");
+      EXPECT_EQ(PlainText(kept.substr(0, size)), std::string(size, '?'));
+    }
+  }
+  for (const std::string broken :
+       {"\x80", "\xbf\xbf", "\xc0\x80", "\xc1\xbf", "\xe0\x9f\xbf", "\xed\xa0\x80", "\xed\xbf\xbf",
+        "\xf0\x8f\xbf\xbf", "\xf4\x90\x80\x80", "\xf5\x80\x80\x80", "\xff\xfe"}) {
+    EXPECT_EQ(PlainText("a" + broken + "b"), "a" + std::string(broken.size(), '?') + "b");
+  }
+}
+
+TEST(PlainTextTest, HoldsNoControlCharacterOfTwoBytes) {
+  EXPECT_EQ(PlainText("a\xc2\x9b[1mb\xc2\x80"), "a?[1mb?");
+}
+
 TEST(PlainTextTest, IsBounded) {
   EXPECT_EQ(PlainText(std::string(500, 'x')), std::string(500, 'x'));
   EXPECT_EQ(PlainText(std::string(501, 'x')), std::string(500, 'x') + "...");
+  EXPECT_EQ(PlainText(std::string(499, 'x') + "\xc3\xa9"), std::string(499, 'x') + "...");
 }
 
 }  // namespace

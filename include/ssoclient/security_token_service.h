@@ -67,8 +67,8 @@ class SecurityTokenService {
   /// Asks for a token by a negotiated login (SPNego in WS-Trust 1.3, section 8): `handler` makes
   /// the legs, all of which travel in one session with its cookies, each within 240 seconds. Bound
   /// to the key as by `AcquireToken`. Throws `Tarnik::InvalidArgumentException` when the handler
-  /// returns null and `CommunicationException` when an answer names no negotiation; what the
-  /// handler throws passes through unchanged.
+  /// returns null and `CommunicationException` when an answer names no negotiation or the service
+  /// asks for more than 1000 legs; what the handler throws passes through unchanged.
   virtual std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec& spec,
                                                              NegotiationHandler& handler) const = 0;
   /// Asks for a holder-of-key token for the owner of the configured certificate (Web Services

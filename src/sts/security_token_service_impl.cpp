@@ -6,9 +6,9 @@
 #include "sts/logger.h"
 #include "sts/negotiation_leg.h"
 #include "sts/pass_by_ref_helper.h"
-#include "sts/secret_text.h"
 #include "sts/sync_to_async_call.h"
 #include "token/default_clock_tolerance.h"
+#include "xml/secret_text.h"
 
 namespace SsoClient {
 
@@ -45,6 +45,17 @@ std::shared_ptr<const std::vector<unsigned char>> NextLeg(
         "Invalid NegotiationHandler: the returned leg may not be NULL");
   }
   return leg;
+}
+
+// No mechanism takes more than a few. A service may answer on and on without a byte of its own, and
+// a handler then begin anew each time, so that nobody else would ever end the loop.
+constexpr int kMaxLegs = 1000;
+
+void CountLeg(int& legs) {
+  if (++legs > kMaxLegs) {
+    throw CommunicationException("The service asks for more than " + std::to_string(kMaxLegs) +
+                                 " legs of SPNego.");
+  }
 }
 
 void CheckContextId(const NegotiationResponse& answer) {
@@ -97,13 +108,15 @@ TokenHandle SecurityTokenServiceImpl::AcquireTokenByGSS(const TokenSpec& spec,
   const auto session = transport_->CreateSession();
   const NegotiationParts parts{*requestBuilder_, *session, *responseHandler_};
   NegotiationResponse answer;
+  SecretText assertion;
+  int legs = 0;
   do {
+    CountLeg(legs);
     const auto leg = NextLeg(handler, answer.leg);
     answer = SendNegotiationLeg(parts, spec, answer.contextId, *leg);
+    assertion.text.swap(answer.token);
     CheckContextId(answer);
-  } while (answer.token.empty());
-  SecretText assertion;
-  assertion.text.swap(answer.token);
+  } while (assertion.text.empty());
   HandOverLastLeg(handler, answer.leg);
   return MakeToken(assertion.text);
 }

@@ -3,6 +3,8 @@
 #include <iterator>
 #include <utility>
 
+#include <tarnik/text/string_util.h>
+
 #include "token/validity_rules.h"
 
 namespace SsoClient {
@@ -38,6 +40,10 @@ SamlTokenImpl::SamlTokenImpl(ParsedAssertion&& assertion, std::string xml, long 
       advice_(std::move(assertion.advice)),
       holderOfKeyCertificate_(std::move(assertion.subject.holderOfKeyCertificate)),
       signature_(std::move(assertion.signature)) {}
+
+SamlTokenImpl::~SamlTokenImpl() {
+  Tarnik::StringUtil::Cleanse(xml_);
+}
 
 Tarnik::System::DateTime SamlTokenImpl::ExpirationTimeWithTolerance() const {
   const long end = Tarnik::System::SaturatingAdd(expirationTime_.GetUtcTime(),

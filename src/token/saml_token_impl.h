@@ -16,6 +16,8 @@ namespace SsoClient {
 class SamlTokenImpl final : public SamlToken {
  public:
   SamlTokenImpl(ParsedAssertion&& assertion, std::string xml, long clockToleranceSec);
+  /// Cleanses the text from memory: who has that of a bearer token is its bearer.
+  ~SamlTokenImpl();
 
   const std::string& Id() const override { return id_; }
   const Tarnik::System::DateTime& StartTime() const override { return startTime_; }

@@ -4,6 +4,7 @@
 
 #include "xml/builder_factories.h"
 #include "xml/namespaces.h"
+#include "xml/secret_text.h"
 
 namespace SsoClient {
 
@@ -14,8 +15,10 @@ constexpr char kSpnegoValueType[] = "http://schemas.xmlsoap.org/ws/2005/02/trust
 }  // namespace
 
 std::shared_ptr<XMLBaseBuilder> BuildBinaryExchange(const std::vector<unsigned char>& leg) {
+  SecretText text;
+  text.text = Tarnik::StringUtil::Base64Encode(leg);
   return MakeTextElementBuilder(
-      "wst", "BinaryExchange", Tarnik::StringUtil::Base64Encode(leg),
+      "wst", "BinaryExchange", text.text,
       {{"EncodingType", kBase64BinaryEncoding}, {"ValueType", kSpnegoValueType}});
 }
 

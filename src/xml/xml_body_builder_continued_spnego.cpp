@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include <tarnik/text/string_util.h>
+
 #include "xml/binary_exchange.h"
 #include "xml/builder_factories.h"
 
@@ -10,6 +12,10 @@ namespace SsoClient {
 XMLBodyBuilderContinuedSPNego::XMLBodyBuilderContinuedSPNego(std::string contextId,
                                                              std::vector<unsigned char> leg)
     : contextId_(std::move(contextId)), leg_(std::move(leg)) {}
+
+XMLBodyBuilderContinuedSPNego::~XMLBodyBuilderContinuedSPNego() {
+  Tarnik::StringUtil::Cleanse(leg_);
+}
 
 void XMLBodyBuilderContinuedSPNego::Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const {
   const auto body = MakeCompositeBuilder("wst", "RequestSecurityTokenResponse");

@@ -13,6 +13,10 @@ XMLBodyBuilderInitialSPNego::XMLBodyBuilderInitialSPNego(unsigned keyType, Token
                                                          std::vector<unsigned char> leg)
     : keyType_(keyType), spec_(std::move(spec)), leg_(std::move(leg)) {}
 
+XMLBodyBuilderInitialSPNego::~XMLBodyBuilderInitialSPNego() {
+  Tarnik::StringUtil::Cleanse(leg_);
+}
+
 void XMLBodyBuilderInitialSPNego::Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const {
   const auto body = BuildIssueBodyWithUseKey(keyType_, spec_);
   body->Add(BuildBinaryExchange(leg_));

@@ -10,11 +10,13 @@
 namespace SsoClient {
 
 /// The request that opens an SPNego negotiation (WS-Trust 1.3, section 8): asks for a token and
-/// carries the first leg. Each build draws a new context id.
+/// carries the first leg. Each build draws a new context id. The leg, which logs
+/// its maker in, is cleansed from memory when the builder dies.
 class XMLBodyBuilderInitialSPNego final : public XMLBaseBuilder {
  public:
   /// `keyType` as for `BuildIssueBody`.
   XMLBodyBuilderInitialSPNego(unsigned keyType, TokenSpec spec, std::vector<unsigned char> leg);
+  ~XMLBodyBuilderInitialSPNego() override;
 
   /// Throws as `BuildIssueBody` does.
   void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const override;

@@ -3,7 +3,7 @@
 #include <utility>
 
 #include "sts/negotiation_leg.h"
-#include "sts/secret_text.h"
+#include "xml/secret_text.h"
 
 namespace SsoClient::InternalApi {
 
@@ -22,11 +22,11 @@ GssNegotiationResult GssNegotiationContextImpl::Negotiate(
     const std::vector<unsigned char>& inputLeg) {
   NegotiationResponse answer = SendNegotiationLeg({*requestBuilder_, *session_, *responseHandler_},
                                                   spec_, contextId_, inputLeg);
+  SecretText assertion;
+  assertion.text.swap(answer.token);
   contextId_.swap(answer.contextId);
   GssNegotiationResult result;
   result.outputLeg = std::make_shared<std::vector<unsigned char>>(std::move(answer.leg));
-  SecretText assertion;
-  assertion.text.swap(answer.token);
   if (!assertion.text.empty()) {
     result.token = CreateSamlToken(assertion.text, keyInfoResolver_.get());
   }

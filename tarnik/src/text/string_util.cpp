@@ -143,4 +143,12 @@ void Cleanse(std::string& text) noexcept {
   text.clear();
 }
 
+void Cleanse(std::vector<unsigned char>& bytes) noexcept {
+  if (bytes.capacity() != 0) {  // an empty one may have no bytes at all
+    bytes.resize(bytes.capacity());
+    explicit_bzero(bytes.data(), bytes.size());
+  }
+  bytes.clear();
+}
+
 }  // namespace Tarnik::StringUtil

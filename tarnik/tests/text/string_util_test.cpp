@@ -83,6 +83,21 @@ TEST(ToLowerTest, ChangesAsciiLettersAlone) {
   EXPECT_EQ(ToLower("AbZ[@`\xC3\x84 09"), "abz[@`\xC3\x84 09");
 }
 
+TEST(CleanseTest, OverwritesBytesToTheEndOfTheirMemory) {
+  std::vector<unsigned char> bytes(500, 's');
+  const unsigned char* memory = bytes.data();
+  bytes.resize(300);
+  Cleanse(bytes);
+  EXPECT_TRUE(bytes.empty());
+  EXPECT_EQ(bytes.data(), memory);
+  bytes.resize(300, 0);
+  EXPECT_EQ(memory[0], 0);
+  EXPECT_EQ(memory[299], 0);
+  std::vector<unsigned char> empty;
+  Cleanse(empty);
+  EXPECT_EQ(empty.capacity(), 0U);
+}
+
 TEST(CleanseTest, OverwritesShortAndLongTexts) {
   for (const std::size_t length : {std::size_t{5}, std::size_t{500}}) {
     std::string text(length, 's');

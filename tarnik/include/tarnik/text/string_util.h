@@ -27,6 +27,9 @@ TARNIK_EXPORT std::string ToLower(std::string_view text);
 /// Overwrites the bytes of `text` in a way that is not optimised away, then empties it.
 TARNIK_EXPORT void Cleanse(std::string& text) noexcept;
 
+/// The same for bytes.
+TARNIK_EXPORT void Cleanse(std::vector<unsigned char>& bytes) noexcept;
+
 }  // namespace Tarnik::StringUtil
 
 #endif

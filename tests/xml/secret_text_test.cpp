@@ -1,4 +1,4 @@
-#include "sts/secret_text.h"
+#include "xml/secret_text.h"
 
 #include <gmock/gmock.h>
 

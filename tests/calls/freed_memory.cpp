@@ -1,0 +1,57 @@
+#include "calls/freed_memory.h"
+
+#include <malloc.h>
+
+#include <cstdlib>
+#include <cstring>
+#include <new>
+#include <utility>
+
+namespace SsoClient::Testing {
+
+namespace {
+
+std::atomic<FreedMemory*> current{nullptr};
+
+void Release(void* memory) noexcept {
+  if (auto* watch = current.load(); watch != nullptr && memory != nullptr) {
+    watch->Look(memory);
+  }
+  std::free(memory);
+}
+
+}  // namespace
+
+FreedMemory::FreedMemory(std::string text) : text_(std::move(text)) {
+  current = this;
+}
+
+FreedMemory::~FreedMemory() {
+  current = nullptr;
+}
+
+void FreedMemory::Look(const void* memory) noexcept {
+  const std::size_t size = ::malloc_usable_size(const_cast<void*>(memory));
+  if (::memmem(memory, size, text_.data(), text_.size()) != nullptr) {
+    ++finds_;
+  }
+}
+
+}  // namespace SsoClient::Testing
+
+void* operator new(std::size_t size) {
+  // Without what an earlier owner left in it.
+  void* memory = std::calloc(1, size != 0 ? size : 1);
+  if (memory == nullptr) {
+    throw std::bad_alloc();
+  }
+  return memory;
+}
+
+void operator delete(void* memory) noexcept {
+  SsoClient::Testing::Release(memory);
+}
+
+void operator delete(void* memory, std::size_t) noexcept {
+  SsoClient::Testing::Release(memory);
+}
