@@ -2,33 +2,18 @@
 
 #include <gmock/gmock.h>
 
-#include <atomic>
 #include <cstdlib>
 #include <cstring>
 #include <string>
 
-namespace {
-
-std::atomic<bool> hasReleasedASecret{false};
-
-constexpr char kSecret[] = "what logs somebody in";
-
-}  // namespace
-
-// The linker puts the second for the first, and leaves the library's own as the first.
-extern "C" {
-
-OM_uint32 __real_gss_release_buffer(OM_uint32*, gss_buffer_t);
-
-OM_uint32 __wrap_gss_release_buffer(OM_uint32* minor, gss_buffer_t buffer) {
-  const std::string content(static_cast<const char*>(buffer->value), buffer->length);
-  hasReleasedASecret = hasReleasedASecret || content.find(kSecret) != std::string::npos;
-  return __real_gss_release_buffer(minor, buffer);
-}
-}
+#include "released_buffers.h"
 
 namespace SsoClient {
 namespace {
+
+using Testing::LastReleasedBuffer;
+
+constexpr char kSecret[] = "what logs somebody in";
 
 void Fill(gss_buffer_t buffer) {
   buffer->length = sizeof(kSecret);
@@ -41,12 +26,12 @@ TEST(GssBufferTest, IsCleansedBeforeItIsReleased) {
   Fill(&plain);
   OM_uint32 minor = 0;
   ::gss_release_buffer(&minor, &plain);
-  EXPECT_TRUE(hasReleasedASecret.exchange(false));
+  EXPECT_EQ(LastReleasedBuffer(), std::string(kSecret, sizeof(kSecret)));
   {
     GssBuffer buffer;
     Fill(buffer.Address());
   }
-  EXPECT_FALSE(hasReleasedASecret);
+  EXPECT_EQ(LastReleasedBuffer(), std::string(sizeof(kSecret), '\0'));
 }
 
 TEST(GssBufferTest, MayBeReleasedEmptyAndTwice) {
