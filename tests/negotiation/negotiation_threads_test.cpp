@@ -36,30 +36,34 @@ TEST_F(NegotiationThreadsTest, LogInSideBySide) {
   }
 }
 
-using Token = std::shared_ptr<const SamlToken>;
+/// What a callback received, kept beyond the call.
+struct Outcome {
+  std::shared_ptr<const SamlToken> token;
+  std::unique_ptr<Tarnik::Throwable> error;
+};
 
-std::future<Token> Start(const SecurityTokenService& service, NegotiationHandler& handler) {
-  const auto result = std::make_shared<std::promise<Token>>();
-  service.AcquireTokenByGSSAsync(TenMinutes(), handler,
-                                 [result](const Token& token, const Tarnik::Exception* error) {
-                                   try {
-                                     error == nullptr ? result->set_value(token) : error->Throw();
-                                   } catch (...) {
-                                     result->set_exception(std::current_exception());
-                                   }
-                                 });
-  return result->get_future();
+std::future<Outcome> Start(const SecurityTokenService& service, NegotiationHandler& handler) {
+  // Shared, since the callback may still be leaving when the outcome is here.
+  const auto outcome = std::make_shared<std::promise<Outcome>>();
+  service.AcquireTokenByGSSAsync(
+      TenMinutes(), handler,
+      [outcome](const std::shared_ptr<const SamlToken>& token, const Tarnik::Exception* error) {
+        outcome->set_value({token, error == nullptr ? nullptr : error->Clone()});
+      });
+  return outcome->get_future();
 }
 
 TEST_F(NegotiationThreadsTest, AsyncLoginsRunSideBySide) {
   std::vector<std::shared_ptr<GssapiNegotiationHandler>> handlers;
-  std::vector<std::future<Token>> tokens;
+  std::vector<std::future<Outcome>> outcomes;
   for (int i = 0; i < 8; ++i) {
     handlers.push_back(Alice());
-    tokens.push_back(Start(*Service(), *handlers.back()));
+    outcomes.push_back(Start(*Service(), *handlers.back()));
   }
-  for (auto& token : tokens) {
-    EXPECT_EQ(token.get()->Subject().name, "alice");
+  for (auto& outcome : outcomes) {
+    const auto token = outcome.get().token;
+    ASSERT_NE(token, nullptr);
+    EXPECT_EQ(token->Subject().name, "alice");
   }
 }
 
@@ -67,9 +71,11 @@ TEST_F(NegotiationThreadsTest, AsyncFailureOfKerberosReachesTheCallback) {
   auto config = AsAlice();
   config.targetService = "HTTP@unknown.example";
   const auto handler = CreateGssapiNegotiationHandler(config);
-  auto token = Start(*Service(), *handler);
-  EXPECT_THAT(MessageOf<SsoException>([&] { token.get(); }),
-              ::testing::HasSubstr("not found in Kerberos database"));
+  const auto outcome = Start(*Service(), *handler).get();
+  EXPECT_EQ(outcome.token, nullptr);
+  ASSERT_NE(outcome.error, nullptr);
+  EXPECT_EQ(typeid(*outcome.error), typeid(SsoException));
+  EXPECT_THAT(outcome.error->Message(), ::testing::HasSubstr("not found in Kerberos database"));
 }
 
 }  // namespace
