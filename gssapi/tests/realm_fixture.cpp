@@ -1,6 +1,7 @@
 #include "realm_fixture.h"
 
 #include <cstdlib>
+#include <fstream>
 
 namespace SsoClient::Testing {
 
@@ -40,6 +41,14 @@ GssapiNegotiationConfig RealmFixture::MachineConfig() {
   config.principal = "machine";
   config.keytab = machineKeytab;
   return config;
+}
+
+void RealmFixture::ReplaceKdc(unsigned short port) {
+  realm->StopKdc();
+  std::ofstream(realm->ConfigPath())
+      << "[libdefaults]\n default_realm = EXAMPLE.COM\n dns_canonicalize_hostname = false\n"
+         " udp_preference_limit = 1\n[realms]\n EXAMPLE.COM = {\n  kdc = 127.0.0.1:"
+      << port << "\n }\n";
 }
 
 void RealmFixture::SetDefaultCache(const std::string& name) {

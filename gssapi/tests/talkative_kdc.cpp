@@ -1,7 +1,6 @@
 #include "talkative_kdc.h"
 
 #include <arpa/inet.h>
-#include <netinet/in.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -13,25 +12,6 @@
 namespace SsoClient::Testing {
 
 namespace {
-
-sockaddr_in AddressOf(int socket) {
-  sockaddr_in address{};
-  socklen_t size = sizeof(address);
-  ::getsockname(socket, reinterpret_cast<sockaddr*>(&address), &size);
-  return address;
-}
-
-int Listen() {
-  const int listener = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-  sockaddr_in address{};
-  address.sin_family = AF_INET;
-  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-  if (::bind(listener, reinterpret_cast<const sockaddr*>(&address), sizeof(address)) != 0 ||
-      ::listen(listener, 16) != 0) {
-    throw std::runtime_error("The KDC cannot listen");
-  }
-  return listener;
-}
 
 bool Receive(int connection, void* data, std::size_t size) {
   return ::recv(connection, data, size, MSG_WAITALL) == static_cast<ssize_t>(size);
@@ -55,21 +35,20 @@ void Answer(int connection, const std::string& message) {
 }  // namespace
 
 TalkativeKdc::TalkativeKdc(std::string text)
-    : text_(std::move(text)), listener_(Listen()), thread_([this] { Serve(); }) {}
+    : text_(std::move(text)), thread_([this] { Serve(); }) {}
 
 TalkativeKdc::~TalkativeKdc() {
-  ::shutdown(listener_, SHUT_RDWR);
+  ::shutdown(listener_.Handle(), SHUT_RDWR);
   thread_.join();
-  ::close(listener_);
 }
 
 unsigned short TalkativeKdc::Port() const {
-  return ntohs(AddressOf(listener_).sin_port);
+  return listener_.Port();
 }
 
 void TalkativeKdc::Serve() const {
   const std::string message = KerberosError(text_);
-  for (int connection = 0; (connection = ::accept(listener_, nullptr, nullptr)) >= 0;) {
+  for (int connection = 0; (connection = ::accept(listener_.Handle(), nullptr, nullptr)) >= 0;) {
     Answer(connection, message);
     ::close(connection);
   }

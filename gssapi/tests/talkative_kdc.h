@@ -4,6 +4,8 @@
 #include <string>
 #include <thread>
 
+#include "loopback_listener.h"
+
 namespace SsoClient::Testing {
 
 /// A KDC on loopback that answers every request with an error (RFC 4120, section 5.9.1) that has a
@@ -21,7 +23,7 @@ class TalkativeKdc {
   void Serve() const;
 
   std::string text_;
-  int listener_;
+  LoopbackListener listener_;
   std::thread thread_;
 };
 
