@@ -248,6 +248,10 @@ void Run(Arguments arguments) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  if (argc == 2 && std::string(argv[1]) == "--help") {
+    std::cout << kUsage;
+    return 0;
+  }
   try {
     Run(Parse(argc, argv));
     return 0;
