@@ -43,7 +43,7 @@ GssapiNegotiationConfig RealmFixture::MachineConfig() {
   return config;
 }
 
-void RealmFixture::ReplaceKdc(unsigned short port) {
+void RealmFixture::ReplaceKdc(int port) {
   realm->StopKdc();
   std::ofstream(realm->ConfigPath())
       << "[libdefaults]\n default_realm = EXAMPLE.COM\n dns_canonicalize_hostname = false\n"

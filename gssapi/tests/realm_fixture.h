@@ -28,7 +28,7 @@ class RealmFixture : public testing::Test {
   static GssapiNegotiationConfig MachineConfig();
   /// Stops the realm's KDC and has this process look for it at a port of 127.0.0.1, by TCP, until
   /// the realm's clock is set.
-  static void ReplaceKdc(unsigned short port);
+  static void ReplaceKdc(int port);
   /// No thread may run meanwhile.
   static void SetDefaultCache(const std::string& name);
 

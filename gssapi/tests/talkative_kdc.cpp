@@ -34,21 +34,25 @@ void Answer(int connection, const std::string& message) {
 
 }  // namespace
 
-TalkativeKdc::TalkativeKdc(std::string text)
-    : text_(std::move(text)), thread_([this] { Serve(); }) {}
+TalkativeKdc::TalkativeKdc(std::string text) : text_(std::move(text)) {
+  if (::listen(socket_.Descriptor(), 16) != 0) {
+    throw std::runtime_error("The KDC cannot listen");
+  }
+  thread_ = std::thread([this] { Serve(); });
+}
 
 TalkativeKdc::~TalkativeKdc() {
-  ::shutdown(listener_.Handle(), SHUT_RDWR);
+  ::shutdown(socket_.Descriptor(), SHUT_RDWR);
   thread_.join();
 }
 
-unsigned short TalkativeKdc::Port() const {
-  return listener_.Port();
+int TalkativeKdc::Port() const {
+  return socket_.Port();
 }
 
 void TalkativeKdc::Serve() const {
   const std::string message = KerberosError(text_);
-  for (int connection = 0; (connection = ::accept(listener_.Handle(), nullptr, nullptr)) >= 0;) {
+  for (int connection = 0; (connection = ::accept(socket_.Descriptor(), nullptr, nullptr)) >= 0;) {
     Answer(connection, message);
     ::close(connection);
   }

@@ -4,7 +4,7 @@
 #include <string>
 #include <thread>
 
-#include "loopback_listener.h"
+#include "transport/loopback_server.h"
 
 namespace SsoClient::Testing {
 
@@ -17,13 +17,13 @@ class TalkativeKdc {
   TalkativeKdc& operator=(const TalkativeKdc&) = delete;
   ~TalkativeKdc();
 
-  unsigned short Port() const;
+  int Port() const;
 
  private:
   void Serve() const;
 
   std::string text_;
-  LoopbackListener listener_;
+  LoopbackSocket socket_;
   std::thread thread_;
 };
 

@@ -1,10 +1,10 @@
 // Many logins at once, and the asynchronous twin.
 #include <gmock/gmock.h>
 
-#include <future>
 #include <thread>
 
 #include "negotiation/realm_fixture.h"
+#include "support/async_call.h"
 
 namespace SsoClient::Tests {
 namespace {
@@ -36,34 +36,17 @@ TEST_F(NegotiationThreadsTest, LogInSideBySide) {
   }
 }
 
-/// What a callback received, kept beyond the call.
-struct Outcome {
-  std::shared_ptr<const SamlToken> token;
-  std::unique_ptr<Tarnik::Throwable> error;
-};
-
-std::future<Outcome> Start(const SecurityTokenService& service, NegotiationHandler& handler) {
-  // Shared, since the callback may still be leaving when the outcome is here.
-  const auto outcome = std::make_shared<std::promise<Outcome>>();
-  service.AcquireTokenByGSSAsync(
-      TenMinutes(), handler,
-      [outcome](const std::shared_ptr<const SamlToken>& token, const Tarnik::Exception* error) {
-        outcome->set_value({token, error == nullptr ? nullptr : error->Clone()});
-      });
-  return outcome->get_future();
-}
-
 TEST_F(NegotiationThreadsTest, AsyncLoginsRunSideBySide) {
-  std::vector<std::shared_ptr<GssapiNegotiationHandler>> handlers;
-  std::vector<std::future<Outcome>> outcomes;
-  for (int i = 0; i < 8; ++i) {
-    handlers.push_back(Alice());
-    outcomes.push_back(Start(*Service(), *handlers.back()));
+  const auto service = Service();
+  std::vector<std::shared_ptr<GssapiNegotiationHandler>> handlers(8);
+  std::vector<Testing::AsyncCall> calls(handlers.size());
+  for (std::size_t i = 0; i < calls.size(); ++i) {
+    handlers[i] = Alice();
+    service->AcquireTokenByGSSAsync(TenMinutes(), *handlers[i], calls[i].Callback());
   }
-  for (auto& outcome : outcomes) {
-    const auto token = outcome.get().token;
-    ASSERT_NE(token, nullptr);
-    EXPECT_EQ(token->Subject().name, "alice");
+  for (auto& call : calls) {
+    const auto report = call.Wait();
+    EXPECT_EQ(report.token == nullptr ? report.message : report.token->Subject().name, "alice");
   }
 }
 
@@ -71,11 +54,12 @@ TEST_F(NegotiationThreadsTest, AsyncFailureOfKerberosReachesTheCallback) {
   auto config = AsAlice();
   config.targetService = "HTTP@unknown.example";
   const auto handler = CreateGssapiNegotiationHandler(config);
-  const auto outcome = Start(*Service(), *handler).get();
-  EXPECT_EQ(outcome.token, nullptr);
-  ASSERT_NE(outcome.error, nullptr);
-  EXPECT_EQ(typeid(*outcome.error), typeid(SsoException));
-  EXPECT_THAT(outcome.error->Message(), ::testing::HasSubstr("not found in Kerberos database"));
+  Testing::AsyncCall call;
+  Service()->AcquireTokenByGSSAsync(TenMinutes(), *handler, call.Callback());
+  const auto report = call.Wait();
+  EXPECT_EQ(report.token, nullptr);
+  EXPECT_EQ(report.errorType, typeid(SsoException).name());
+  EXPECT_THAT(report.message, ::testing::HasSubstr("not found in Kerberos database"));
 }
 
 }  // namespace

@@ -100,9 +100,8 @@ TEST_F(CreateSecurityTokenServiceTest, SignsWithTheConfiguredKeyOrNotAtAll) {
   EXPECT_EQ(ByCertificateWithoutAKey(config_), kNoKey);
   config_.holderOfKeyConfig = Testing::ConfigOf(credential);
   CreateSecurityTokenService(config_)->AcquireTokenByCertificate(OneHour());
-  const auto request = server_.Requests().at(0);
-  const auto verdict =
-      DevSts::VerifyXml(request.substr(request.find("\r\n\r\n") + 4), credential.certificatePem);
+  const auto body = Testing::BodyOf(server_.Requests().at(0));
+  const auto verdict = DevSts::VerifyXml(body, credential.certificatePem);
   EXPECT_TRUE(verdict.valid) << verdict.reason;
 }
 

@@ -2,20 +2,17 @@
 #define SSOCLIENT_TESTS_STS_FAKES_H
 
 #include <algorithm>
-#include <future>
 #include <memory>
 #include <mutex>
 #include <optional>
 #include <stdexcept>
 #include <string>
-#include <typeinfo>
 #include <utility>
 #include <vector>
 
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token_factory.h>
-#include <ssoclient/security_token_service.h>
 
 #include "support/fake_saml_token.h"
 #include "transport/transport.h"
@@ -108,29 +105,6 @@ class FakeTokenFactory final : public SamlTokenFactory {
   }
 
   mutable std::mutex mutex_;
-};
-
-/// What a callback was given.
-struct Report {
-  std::shared_ptr<const SamlToken> token;
-  std::string errorType;
-  std::string message;
-};
-
-/// One asynchronous call to wait for.
-class AsyncCall {
- public:
-  SecurityTokenService::TokenCallback Callback() {
-    return [promise = promise_](const std::shared_ptr<const SamlToken>& token,
-                                const Tarnik::Exception* error) {
-      promise->set_value({token, error != nullptr ? typeid(*error).name() : "",
-                          error != nullptr ? error->Message() : ""});
-    };
-  }
-  Report Wait() { return promise_->get_future().get(); }
-
- private:
-  std::shared_ptr<std::promise<Report>> promise_ = std::make_shared<std::promise<Report>>();
 };
 
 }  // namespace SsoClient::Testing

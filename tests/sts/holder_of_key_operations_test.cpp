@@ -3,6 +3,7 @@
 
 #include <array>
 #include <atomic>
+#include <future>
 #include <set>
 #include <string>
 #include <thread>
@@ -16,6 +17,7 @@
 #include "sts/response_handler_impl.h"
 #include "sts/security_token_service_impl.h"
 #include "sts/token_specs.h"
+#include "support/async_call.h"
 #include "support/holder_of_key.h"
 #include "support/vtable_slot.h"
 

@@ -14,6 +14,7 @@
 #include "sts/response_handler_impl.h"
 #include "sts/security_token_service_impl.h"
 #include "sts/token_specs.h"
+#include "support/async_call.h"
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 

@@ -12,6 +12,7 @@
 #include "sts/request_builder_impl.h"
 #include "sts/response_handler_impl.h"
 #include "sts/token_specs.h"
+#include "support/async_call.h"
 #include "support/fake_saml_token.h"
 #include "support/holder_of_key.h"
 #include "support/thrown_message.h"

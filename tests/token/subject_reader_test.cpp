@@ -134,14 +134,16 @@ TEST(ReadSubject, RefusesUnknownMethods) {
   }
 }
 
+// Where something stands behind an expected child, the innermost one first.
+constexpr std::pair<const char*, const char*> kEnds[] = {
+    {"</ds:X509Certificate>", "Unexpected elements after X509Certificate"},
+    {"</ds:X509Data>", "Unexpected elements after X509Data"},
+    {"</ds:KeyInfo>", "Unexpected elements after SubjectConfirmationData/KeyInfo"},
+    {"</saml2:SubjectConfirmationData>", "Unexpected elements after SubjectConfirmationData"},
+    {"</saml2:SubjectConfirmation>", "Unexpected elements after SubjectConfirmation"}};
+
 TEST(ReadSubject, RefusesWhatStandsBehindAnExpectedChild) {
-  const std::pair<const char*, const char*> cases[] = {
-      {"</ds:X509Certificate>", "Unexpected elements after X509Certificate"},
-      {"</ds:X509Data>", "Unexpected elements after X509Data"},
-      {"</ds:KeyInfo>", "Unexpected elements after SubjectConfirmationData/KeyInfo"},
-      {"</saml2:SubjectConfirmationData>", "Unexpected elements after SubjectConfirmationData"},
-      {"</saml2:SubjectConfirmation>", "Unexpected elements after SubjectConfirmation"}};
-  for (const auto& [anchor, message] : cases) {
+  for (const auto& [anchor, message] : kEnds) {
     for (const char* addition : {"<x/>", "text", "<?pi?>"}) {
       EXPECT_EQ(Refusal(InsertedBehind(HolderOfKeyText(), anchor, addition)), message);
     }
@@ -150,17 +152,11 @@ TEST(ReadSubject, RefusesWhatStandsBehindAnExpectedChild) {
 
 // Something stands behind every child: each message shows once the children inside are repaired.
 TEST(ReadSubject, NamesTheInnermostFaultFirst) {
-  const std::pair<const char*, const char*> cases[] = {
-      {"</ds:X509Certificate>", "Unexpected elements after X509Certificate"},
-      {"</ds:X509Data>", "Unexpected elements after X509Data"},
-      {"</ds:KeyInfo>", "Unexpected elements after SubjectConfirmationData/KeyInfo"},
-      {"</saml2:SubjectConfirmationData>", "Unexpected elements after SubjectConfirmationData"},
-      {"</saml2:SubjectConfirmation>", "Unexpected elements after SubjectConfirmation"}};
   std::string text = HolderOfKeyText();
-  for (const auto& [anchor, message] : cases) {
+  for (const auto& [anchor, message] : kEnds) {
     text = InsertedBehind(text, anchor, "<x/>");
   }
-  for (const auto& [anchor, message] : cases) {
+  for (const auto& [anchor, message] : kEnds) {
     EXPECT_EQ(Refusal(text), message);
     text = Replaced(text, std::string(anchor) + "<x/>", anchor);
   }

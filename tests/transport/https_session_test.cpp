@@ -270,7 +270,7 @@ TEST(HttpsSessionWireTest, PostsTheEnvelopeWithTheTwoHeadersInOrder) {
         received,
         testing::HasSubstr("\r\nContent-Type: text/xml\r\nSOAPAction: "
                            "\"http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue\"\r\n"));
-    EXPECT_EQ(received.substr(received.find("\r\n\r\n") + 4), request.body);
+    EXPECT_EQ(Testing::BodyOf(received), request.body);
   }
 }
 

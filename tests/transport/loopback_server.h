@@ -20,7 +20,7 @@ namespace SsoClient::Testing {
 /// An IPv4 loopback socket on a port of the system's choice.
 class LoopbackSocket {
  public:
-  LoopbackSocket() : fd_(::socket(AF_INET, SOCK_STREAM, 0)) {
+  LoopbackSocket() : fd_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
     sockaddr_in address = {};
     address.sin_family = AF_INET;
     address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
@@ -71,6 +71,11 @@ class FullListener {
   LoopbackSocket listener_;
   std::vector<int> fillers_;
 };
+
+/// The body of an HTTP message.
+inline std::string BodyOf(const std::string& message) {
+  return message.substr(message.find("\r\n\r\n") + 4);
+}
 
 /// A plain HTTP server on the loopback address that answers each whole request with what `answer`
 /// makes of it, byte for byte.

@@ -229,9 +229,8 @@ TEST_F(CreateGssNegotiationContextTest, SignsTheFirstLegWithTheConfiguredKey) {
   config.url = server_.Url("/");
   config.holderOfKeyConfig = Testing::ConfigOf(credential);
   Leg(*CreateGssNegotiationContext(config, OneHour()));
-  const auto request = server_.Requests().at(0);
-  const auto verdict =
-      DevSts::VerifyXml(request.substr(request.find("\r\n\r\n") + 4), credential.certificatePem);
+  const auto body = Testing::BodyOf(server_.Requests().at(0));
+  const auto verdict = DevSts::VerifyXml(body, credential.certificatePem);
   EXPECT_TRUE(verdict.valid) << verdict.reason;
 }
 
