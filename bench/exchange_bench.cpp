@@ -8,7 +8,7 @@
 #include <string>
 
 #include "bare_client.h"
-#include "sts/request_builder_impl.h"
+#include "sts/request_builder.h"
 
 // Acquiring a token by password, the whole exchange over TLS included, beside a bare client that
 // sends the same bytes and reads nothing of the answer. Each exchange has a connection of its own.

@@ -18,7 +18,7 @@
 #include <vector>
 
 #include "sample_token.h"
-#include "sts/request_builder_impl.h"
+#include "sts/request_builder.h"
 
 // Making whole requests signed by RSA-SHA256, and signing two references alone, beside the floor:
 // the RSA operation alone.

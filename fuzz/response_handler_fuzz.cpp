@@ -8,7 +8,7 @@
 #include <optional>
 
 #include "input.h"
-#include "sts/response_handler_impl.h"
+#include "sts/response_handler.h"
 #include "xml_input.h"
 
 namespace {

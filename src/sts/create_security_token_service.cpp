@@ -5,8 +5,8 @@
 #include <tarnik/core/exception.h>
 
 #include "sts/holder_of_key_check.h"
-#include "sts/request_builder_impl.h"
-#include "sts/response_handler_impl.h"
+#include "sts/request_builder.h"
+#include "sts/response_handler.h"
 #include "sts/security_token_service_impl.h"
 #include "transport/https_client.h"
 

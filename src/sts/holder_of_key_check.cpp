@@ -5,7 +5,7 @@
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/crypto_exception.h>
 
-#include "token/default_clock_tolerance.h"
+#include "support/clock_tolerance.h"
 
 namespace SsoClient {
 

@@ -6,7 +6,6 @@
 
 #include <ssoclient/token_spec.h>
 
-#include "sts/negotiation_response.h"
 #include "sts/request_builder.h"
 #include "sts/response_handler.h"
 #include "transport/transport.h"

@@ -2,13 +2,18 @@
 #define SSOCLIENT_STS_REQUEST_BUILDER_H
 
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <vector>
 
+#include <boost/optional.hpp>
+
+#include <ssoclient/holder_of_key_config.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>
 
-#include "transport/soap_request.h"
+#include "transport/transport.h"
+#include "xml/builders.h"
 
 namespace SsoClient {
 
@@ -49,6 +54,40 @@ class RequestBuilder {
 
  protected:
   ~RequestBuilder() = default;
+};
+
+/// Builds requests, and signs with a key those that prove its possession.
+class RequestBuilderImpl final : public RequestBuilder {
+ public:
+  explicit RequestBuilderImpl(boost::optional<HolderOfKeyConfig> holderOfKeyConfig);
+
+  void BuildAcquireTokenRequest(const std::string& userName, const std::string& password,
+                                const TokenSpec& spec, SoapRequest& request) const override;
+  void BuildInitialNegotiationRequest(const TokenSpec& spec, const std::vector<unsigned char>& leg,
+                                      SoapRequest& request) const override;
+  void BuildContinuedNegotiationRequest(const std::string& contextId,
+                                        const std::vector<unsigned char>& leg,
+                                        SoapRequest& request) const override;
+  void BuildAcquireTokenByCertificateRequest(const TokenSpec& spec,
+                                             SoapRequest& request) const override;
+  void BuildAcquireTokenByTokenRequest(const SamlToken& token, const TokenSpec& spec,
+                                       SoapRequest& request) const override;
+  void BuildValidateRequest(const SamlToken& token, SoapRequest& request) const override;
+  void BuildRenewRequest(const SamlToken& token, std::int64_t lifetimeSec,
+                         SoapRequest& request) const override;
+
+ private:
+  const HolderOfKeyConfig& RequireHolderOfKey(const std::string& operation) const;
+  bool AsksForHolderOfKey(const TokenSpec& spec) const;
+  /// The key type that the body of a request asks for, as `BuildIssueBody` takes it.
+  unsigned KeyTypeFor(const TokenSpec& spec) const;
+  /// The envelope of a request that proves who asks by other means than the key: signed when the
+  /// token is to be bound to the key.
+  std::shared_ptr<XMLBaseBuilder> Enclose(const TokenSpec& spec,
+                                          const std::shared_ptr<XMLBaseBuilder>& header,
+                                          const std::shared_ptr<XMLBaseBuilder>& body) const;
+
+  boost::optional<HolderOfKeyConfig> holderOfKeyConfig_;
 };
 
 }  // namespace SsoClient

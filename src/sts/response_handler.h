@@ -2,12 +2,18 @@
 #define SSOCLIENT_STS_RESPONSE_HANDLER_H
 
 #include <string>
+#include <vector>
 
 #include <tarnik/core/reader.h>
 
-#include "sts/negotiation_response.h"
-
 namespace SsoClient {
+
+/// The answer to one leg of an SPNego negotiation.
+struct NegotiationResponse {
+  std::string contextId;           ///< names the negotiation towards the service
+  std::vector<unsigned char> leg;  ///< the service's leg; empty when the answer carries none
+  std::string token;               ///< the assertion's canonical text; empty until it is issued
+};
 
 /// Reads the answers of a security token service. Each operation parses straight from the reader,
 /// fills its output only on success, and throws
@@ -33,6 +39,16 @@ class ResponseHandler {
 
  protected:
   ~ResponseHandler() = default;
+};
+
+/// Stateless; safe from many threads.
+class ResponseHandlerImpl final : public ResponseHandler {
+ public:
+  void ParseIssueResponse(Tarnik::Reader* response, std::string& assertion) const override;
+  bool ParseValidateResponse(Tarnik::Reader* response) const override;
+  void ParseRenewResponse(Tarnik::Reader* response, std::string& assertion) const override;
+  void ParseNegotiationResponse(Tarnik::Reader* response,
+                                NegotiationResponse& negotiation) const override;
 };
 
 }  // namespace SsoClient

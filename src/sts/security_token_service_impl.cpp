@@ -3,12 +3,11 @@
 #include <utility>
 
 #include "describe/describe.h"
+#include "sts/async_call.h"
 #include "sts/logger.h"
 #include "sts/negotiation_leg.h"
-#include "sts/pass_by_ref_helper.h"
-#include "sts/sync_to_async_call.h"
-#include "token/default_clock_tolerance.h"
-#include "xml/secret_text.h"
+#include "support/clock_tolerance.h"
+#include "support/secret_text.h"
 
 namespace SsoClient {
 

@@ -4,10 +4,9 @@
 #include <utility>
 
 #include "deployment.h"
-#include "token/attribute_reader.h"
-#include "token/attribute_rules.h"
-#include "token/element_rules.h"
-#include "token/saml_names.h"
+#include "support/namespaces.h"
+#include "token/statement_readers.h"
+#include "token/strict_rules.h"
 
 namespace SsoClient {
 namespace {

@@ -4,16 +4,13 @@
 
 #include <ssoclient/exceptions.h>
 
+#include "support/namespaces.h"
 #include "token/advice_reader.h"
-#include "token/attribute_rules.h"
-#include "token/attribute_statement_reader.h"
-#include "token/authn_statement_reader.h"
 #include "token/child_cursor.h"
 #include "token/conditions_reader.h"
-#include "token/element_rules.h"
 #include "token/name_id_reader.h"
-#include "token/saml_names.h"
-#include "token/skip_ws_and_comments_filter.h"
+#include "token/statement_readers.h"
+#include "token/strict_rules.h"
 #include "token/subject_reader.h"
 #include "token/token_signature.h"
 

@@ -6,10 +6,25 @@
 #include <utility>
 
 #include <tarnik/xml/element_node.h>
-
-#include "token/node_filter.h"
+#include <tarnik/xml/node.h>
 
 namespace SsoClient {
+
+/// Decides which nodes a reader gets to see. Implementations are safe to share between threads.
+class NodeFilter {
+ public:
+  /// True when the reader is to see `node`, false when it is to skip it.
+  virtual bool IsVisible(const Tarnik::Xml::Node& node) const = 0;
+
+ protected:
+  ~NodeFilter() = default;
+};
+
+/// Hides comments and text of white space alone (XML 1.0, section 2.3: S); shows everything else.
+class SkipWsAndCommentsFilter final : public NodeFilter {
+ public:
+  bool IsVisible(const Tarnik::Xml::Node& node) const override;
+};
 
 /// Walks the children of one element in document order, over those that the filter shows.
 /// Does not keep the tree alive.

@@ -6,10 +6,9 @@
 #include <ssoclient/exceptions.h>
 
 #include "deployment.h"
-#include "token/attribute_rules.h"
-#include "token/element_rules.h"
+#include "support/namespaces.h"
 #include "token/name_id_reader.h"
-#include "token/saml_names.h"
+#include "token/strict_rules.h"
 
 namespace SsoClient {
 namespace {

@@ -8,8 +8,8 @@
 #include <tarnik/xml/security/canonicalizer.h>
 #include <tarnik/xml/xml_parser.h>
 
+#include "support/clock_tolerance.h"
 #include "token/assertion_reader.h"
-#include "token/default_clock_tolerance.h"
 #include "token/saml_token_impl.h"
 #include "token/token_signature.h"
 #include "token/validity_rules.h"

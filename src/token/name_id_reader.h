@@ -3,10 +3,20 @@
 
 #include <string_view>
 
+#include <ssoclient/principal_id.h>
+
 #include "token/child_cursor.h"
 #include "token/parsed_assertion.h"
 
 namespace SsoClient {
+
+/// The principal of a name id of the user-principal-name format, "name@domain"; the last at sign
+/// separates. Throws `ParseException` for another format or an empty or missing part.
+PrincipalId PrincipalFromNameId(std::string_view format, std::string_view value);
+
+/// The group that "domain\group" names; the first backslash separates. Throws `ParseException` for
+/// an empty or missing part.
+PrincipalId PrincipalFromGroupIdentity(std::string_view value);
 
 /// Reads an element of the NameIDType (SAML 2.0 core, section 2.2.2): Issuer or NameID. Throws
 /// `ParseException`.

@@ -1,6 +1,6 @@
 #include "token/saml_token_factory_default.h"
 
-#include "token/default_clock_tolerance.h"
+#include "support/clock_tolerance.h"
 
 namespace SsoClient {
 

@@ -5,11 +5,10 @@
 #include <ssoclient/exceptions.h>
 #include <tarnik/text/string_util.h>
 
-#include "token/attribute_rules.h"
-#include "token/concat.h"
-#include "token/element_rules.h"
+#include "support/concat.h"
+#include "support/namespaces.h"
 #include "token/name_id_reader.h"
-#include "token/saml_names.h"
+#include "token/strict_rules.h"
 
 namespace SsoClient {
 namespace {

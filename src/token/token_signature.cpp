@@ -5,9 +5,9 @@
 #include <ssoclient/exceptions.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 
-#include "token/concat.h"
-#include "token/element_rules.h"
-#include "token/saml_names.h"
+#include "support/concat.h"
+#include "support/namespaces.h"
+#include "token/strict_rules.h"
 
 namespace SsoClient {
 namespace {

@@ -2,7 +2,7 @@
 
 #include <ssoclient/exceptions.h>
 
-#include "token/concat.h"
+#include "support/concat.h"
 
 namespace SsoClient {
 namespace {

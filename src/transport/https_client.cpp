@@ -6,8 +6,8 @@
 #include <tarnik/http/cookie_store.h>
 #include <tarnik/http/http_url.h>
 
-#include "transport/connection_specs.h"
 #include "transport/https_session.h"
+#include "transport/sso_connection_specs.h"
 
 namespace SsoClient {
 

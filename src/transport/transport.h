@@ -3,15 +3,27 @@
 
 #include <functional>
 #include <memory>
+#include <string>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/core/reader.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/http/http_user_agent.h>
-
-#include "transport/soap_request.h"
+#include <tarnik/text/string_util.h>
 
 namespace SsoClient {
+
+/// What a session posts. Not copied, and its body is cleansed from memory when it dies, since it
+/// holds passwords and tokens.
+struct SoapRequest {
+  std::string action;  ///< the SOAPAction URI, without quotes
+  std::string body;    ///< the whole serialised envelope
+
+  SoapRequest() = default;
+  SoapRequest(const SoapRequest&) = delete;
+  SoapRequest& operator=(const SoapRequest&) = delete;
+  ~SoapRequest() { Tarnik::StringUtil::Cleanse(body); }
+};
 
 /// One exchange, or one negotiation of several. Used by one exchange at a time. Owned through a
 /// `std::shared_ptr` to the concrete class.

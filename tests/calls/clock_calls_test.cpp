@@ -3,7 +3,7 @@
 
 #include "calls/recorded_calls.h"
 #include "xml/built_xml.h"
-#include "xml/lifetime.h"
+#include "xml/request_bodies.h"
 #include "xml/security_header.h"
 
 namespace SsoClient {

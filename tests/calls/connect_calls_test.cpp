@@ -3,8 +3,7 @@
 
 #include "calls/recorded_calls.h"
 #include "transport/fake_ssl.h"
-#include "transport/sso_custom_connection_spec_impl.h"
-#include "transport/sso_custom_ssl_connection_spec_impl.h"
+#include "transport/sso_connection_specs.h"
 
 namespace SsoClient {
 namespace {

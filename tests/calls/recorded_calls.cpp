@@ -9,7 +9,7 @@
 #include <tarnik/http/http_user_agent.h>
 #include <tarnik/system/date_time.h>
 
-#include "transport/connection_specs.h"
+#include "transport/sso_connection_specs.h"
 
 namespace SsoClient::Testing {
 namespace {

@@ -1,4 +1,4 @@
-#include "sts/response_handler_impl.h"
+#include "sts/response_handler.h"
 
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>

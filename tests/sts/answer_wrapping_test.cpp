@@ -1,4 +1,4 @@
-#include "sts/response_handler_impl.h"
+#include "sts/response_handler.h"
 
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>

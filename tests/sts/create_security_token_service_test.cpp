@@ -12,10 +12,10 @@
 #include "support/fake_saml_token.h"
 #include "support/holder_of_key.h"
 #include "support/thrown_message.h"
-#include "transport/connection_specs.h"
 #include "transport/fake_http.h"
 #include "transport/fake_ssl.h"
 #include "transport/loopback_server.h"
+#include "transport/sso_connection_specs.h"
 
 namespace SsoClient {
 namespace {

@@ -1,4 +1,4 @@
-#include "sts/request_builder_impl.h"
+#include "sts/request_builder.h"
 
 #include <gmock/gmock.h>
 #include <tarnik/core/exception.h>

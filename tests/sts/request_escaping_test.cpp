@@ -1,4 +1,4 @@
-#include "sts/request_builder_impl.h"
+#include "sts/request_builder.h"
 
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>

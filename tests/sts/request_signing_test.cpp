@@ -8,18 +8,14 @@
 #include <regex>
 #include <string>
 
-#include "sts/request_builder_impl.h"
+#include "sts/request_builder.h"
 #include "support/fake_saml_token.h"
 #include "support/holder_of_key.h"
 #include "support/parse_xml.h"
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 #include "xml/built_xml.h"
-#include "xml/issue_body.h"
-#include "xml/renew_body.h"
-#include "xml/validate_body.h"
-#include "xml/xml_body_builder_continued_spnego.h"
-#include "xml/xml_body_builder_initial_spnego.h"
+#include "xml/request_bodies.h"
 
 namespace SsoClient {
 namespace {

@@ -1,4 +1,4 @@
-#include "sts/response_elements.h"
+#include "sts/response_reading.h"
 
 #include <gmock/gmock.h>
 

@@ -1,4 +1,4 @@
-#include "sts/soap_fault.h"
+#include "sts/response_reading.h"
 
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>

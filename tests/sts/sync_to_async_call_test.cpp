@@ -1,4 +1,4 @@
-#include "sts/sync_to_async_call.h"
+#include "sts/async_call.h"
 
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>

@@ -7,8 +7,8 @@
 #include <tarnik/xml/xml_parser.h>
 
 #include "support/assertion_text.h"
-#include "token/element_rules.h"
-#include "token/skip_ws_and_comments_filter.h"
+#include "token/child_cursor.h"
+#include "token/strict_rules.h"
 
 namespace TestSupport {
 

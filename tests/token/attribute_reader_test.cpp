@@ -1,4 +1,4 @@
-#include "token/attribute_reader.h"
+#include "token/statement_readers.h"
 
 #include <ssoclient/exceptions.h>
 

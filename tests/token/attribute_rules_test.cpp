@@ -1,4 +1,4 @@
-#include "token/attribute_rules.h"
+#include "token/strict_rules.h"
 
 #include <locale>
 

@@ -1,4 +1,4 @@
-#include "token/attribute_statement_reader.h"
+#include "token/statement_readers.h"
 
 #include <ssoclient/exceptions.h>
 #include <tarnik/xml/character_nodes.h>

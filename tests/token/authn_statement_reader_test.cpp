@@ -1,4 +1,4 @@
-#include "token/authn_statement_reader.h"
+#include "token/statement_readers.h"
 
 #include <ssoclient/exceptions.h>
 

@@ -1,7 +1,7 @@
 #include "token/child_cursor.h"
 
 #include "support/parsed_xml.h"
-#include "token/element_rules.h"
+#include "token/strict_rules.h"
 
 namespace SsoClient {
 namespace {

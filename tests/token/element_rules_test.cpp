@@ -1,4 +1,4 @@
-#include "token/element_rules.h"
+#include "token/strict_rules.h"
 
 #include <ssoclient/exceptions.h>
 

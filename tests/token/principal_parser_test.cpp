@@ -1,4 +1,4 @@
-#include "token/principal_parser.h"
+#include "token/name_id_reader.h"
 
 #include <ssoclient/exceptions.h>
 

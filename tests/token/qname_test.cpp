@@ -1,4 +1,4 @@
-#include "token/qname.h"
+#include "support/qname.h"
 
 #include <ssoclient/exceptions.h>
 

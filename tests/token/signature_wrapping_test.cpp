@@ -4,7 +4,7 @@
 #include "support/forgeries.h"
 #include "support/parsed_xml.h"
 #include "support/thrown_message.h"
-#include "token/element_rules.h"
+#include "token/strict_rules.h"
 
 // Forged assertions beside a signed original, in every arrangement: whatever a resolver lets
 // through must be the signed original itself.

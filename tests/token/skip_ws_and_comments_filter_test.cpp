@@ -1,4 +1,4 @@
-#include "token/skip_ws_and_comments_filter.h"
+#include "token/child_cursor.h"
 
 #include <tarnik/xml/character_nodes.h>
 

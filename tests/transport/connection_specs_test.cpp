@@ -1,4 +1,4 @@
-#include "transport/connection_specs.h"
+#include "transport/sso_connection_specs.h"
 
 #include <gmock/gmock.h>
 

@@ -12,10 +12,10 @@
 #include <type_traits>
 
 #include "support/vtable_slot.h"
-#include "transport/connection_specs.h"
 #include "transport/fake_http.h"
 #include "transport/loopback_server.h"
 #include "transport/read_all.h"
+#include "transport/sso_connection_specs.h"
 
 namespace SsoClient {
 namespace {

@@ -1,4 +1,4 @@
-#include "transport/soap_request.h"
+#include "transport/transport.h"
 
 #include <gmock/gmock.h>
 

@@ -1,4 +1,4 @@
-#include "transport/sso_custom_connection_spec_impl.h"
+#include "transport/sso_connection_specs.h"
 
 #include <gmock/gmock.h>
 

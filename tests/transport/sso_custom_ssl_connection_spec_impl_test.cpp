@@ -1,4 +1,4 @@
-#include "transport/sso_custom_ssl_connection_spec_impl.h"
+#include "transport/sso_connection_specs.h"
 
 #include <gmock/gmock.h>
 #include <tarnik/system/tcp_client_socket.h>

@@ -1,4 +1,4 @@
-#include "xml/advice_builders.h"
+#include "xml/request_bodies.h"
 
 #include <gmock/gmock.h>
 

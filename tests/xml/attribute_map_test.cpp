@@ -1,4 +1,4 @@
-#include "xml/attribute_map.h"
+#include "xml/builders.h"
 
 #include <gmock/gmock.h>
 

@@ -1,4 +1,4 @@
-#include "xml/binary_exchange.h"
+#include "xml/request_bodies.h"
 
 #include <gmock/gmock.h>
 

@@ -1,4 +1,4 @@
-#include "xml/binary_security_token.h"
+#include "xml/security_header.h"
 
 #include <gmock/gmock.h>
 #include <tarnik/text/string_util.h>

@@ -1,4 +1,4 @@
-#include "xml/builder_factories.h"
+#include "xml/builders.h"
 
 #include <gmock/gmock.h>
 #include <tarnik/xml/xml_parse_exception.h>

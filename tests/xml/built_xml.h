@@ -14,7 +14,7 @@
 #include <tarnik/xml/element_node.h>
 
 #include "support/parse_xml.h"
-#include "xml/xml_base_builder.h"
+#include "xml/builders.h"
 
 namespace SsoClient::Testing {
 

@@ -1,4 +1,4 @@
-#include "xml/element_builder_impl.h"
+#include "xml/builders.h"
 
 #include <gmock/gmock.h>
 #include <tarnik/core/exception.h>

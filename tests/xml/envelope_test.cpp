@@ -1,8 +1,8 @@
-#include "xml/envelope.h"
+#include "xml/signed_envelope.h"
 
 #include <gmock/gmock.h>
 
-#include "xml/builder_factories.h"
+#include "xml/builders.h"
 #include "xml/built_xml.h"
 
 namespace SsoClient {

@@ -1,4 +1,4 @@
-#include "xml/issue_body.h"
+#include "xml/request_bodies.h"
 
 #include <gmock/gmock.h>
 #include <tarnik/core/exception.h>

@@ -1,4 +1,4 @@
-#include "xml/lifetime.h"
+#include "xml/request_bodies.h"
 
 #include <gmock/gmock.h>
 

@@ -1,4 +1,4 @@
-#include "xml/own_ids.h"
+#include "xml/signed_envelope.h"
 
 #include <gtest/gtest.h>
 #include <tarnik/core/exception.h>

@@ -1,4 +1,4 @@
-#include "xml/participants.h"
+#include "xml/request_bodies.h"
 
 #include <gmock/gmock.h>
 

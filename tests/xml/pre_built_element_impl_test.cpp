@@ -1,4 +1,4 @@
-#include "xml/pre_built_element_impl.h"
+#include "xml/builders.h"
 
 #include <gmock/gmock.h>
 

@@ -1,4 +1,4 @@
-#include "xml/renew_body.h"
+#include "xml/request_bodies.h"
 
 #include <gmock/gmock.h>
 #include <tarnik/xml/xml_parse_exception.h>

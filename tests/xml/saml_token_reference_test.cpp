@@ -1,4 +1,4 @@
-#include "xml/saml_token_reference.h"
+#include "xml/security_header.h"
 
 #include <gmock/gmock.h>
 

@@ -1,4 +1,4 @@
-#include "xml/secret_text.h"
+#include "support/secret_text.h"
 
 #include <gmock/gmock.h>
 

@@ -3,7 +3,7 @@
 #include <gmock/gmock.h>
 
 #include "support/local_zone.h"
-#include "xml/builder_factories.h"
+#include "xml/builders.h"
 #include "xml/built_xml.h"
 
 namespace SsoClient {

@@ -1,4 +1,4 @@
-#include "xml/username_token.h"
+#include "xml/security_header.h"
 
 #include <gmock/gmock.h>
 

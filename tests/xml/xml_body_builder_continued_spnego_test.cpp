@@ -1,8 +1,7 @@
-#include "xml/xml_body_builder_continued_spnego.h"
+#include "xml/request_bodies.h"
 
 #include <gmock/gmock.h>
 
-#include "xml/binary_exchange.h"
 #include "xml/built_xml.h"
 
 namespace SsoClient {

@@ -1,10 +1,8 @@
-#include "xml/xml_body_builder_initial_spnego.h"
+#include "xml/request_bodies.h"
 
 #include <gmock/gmock.h>
 
-#include "xml/binary_exchange.h"
 #include "xml/built_xml.h"
-#include "xml/issue_body.h"
 
 namespace SsoClient {
 namespace {

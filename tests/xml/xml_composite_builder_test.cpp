@@ -1,4 +1,4 @@
-#include "xml/xml_composite_builder.h"
+#include "xml/builders.h"
 
 #include <gmock/gmock.h>
 
@@ -6,7 +6,6 @@
 #include <thread>
 
 #include "support/vtable_slot.h"
-#include "xml/builder_factories.h"
 #include "xml/built_xml.h"
 
 namespace SsoClient {

@@ -1,4 +1,4 @@
-#include "xml/xml_signed_soap_builder.h"
+#include "xml/signed_envelope.h"
 
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
@@ -6,14 +6,11 @@
 #include <tarnik/xml/security/xml_security_exception.h>
 
 #include "support/holder_of_key.h"
+#include "support/namespaces.h"
 #include "support/vtable_slot.h"
-#include "xml/binary_security_token.h"
-#include "xml/builder_factories.h"
+#include "xml/builders.h"
 #include "xml/built_xml.h"
-#include "xml/namespaces.h"
-#include "xml/saml_token_reference.h"
 #include "xml/security_header.h"
-#include "xml/signed_soap_builders.h"
 
 namespace SsoClient {
 namespace {

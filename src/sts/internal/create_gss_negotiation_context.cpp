@@ -4,8 +4,8 @@
 
 #include "sts/holder_of_key_check.h"
 #include "sts/internal/gss_negotiation_context_impl.h"
-#include "sts/request_builder_impl.h"
-#include "sts/response_handler_impl.h"
+#include "sts/request_builder.h"
+#include "sts/response_handler.h"
 #include "transport/https_client.h"
 
 namespace SsoClient::InternalApi {

@@ -3,7 +3,7 @@
 #include <utility>
 
 #include "sts/negotiation_leg.h"
-#include "xml/secret_text.h"
+#include "support/secret_text.h"
 
 namespace SsoClient::InternalApi {
 

@@ -8,8 +8,8 @@
 
 #include "sts/answers.h"
 #include "sts/fakes.h"
-#include "sts/request_builder_impl.h"
-#include "sts/response_handler_impl.h"
+#include "sts/request_builder.h"
+#include "sts/response_handler.h"
 #include "sts/token_specs.h"
 #include "support/assertion_text.h"
 #include "support/fake_saml_token.h"

@@ -1,0 +1,26 @@
+#ifndef SSOCLIENT_SUPPORT_CONCAT_H
+#define SSOCLIENT_SUPPORT_CONCAT_H
+
+#include <initializer_list>
+#include <string>
+#include <string_view>
+
+namespace SsoClient {
+
+/// The parts, one behind the other.
+inline std::string Concat(std::initializer_list<std::string_view> parts) {
+  std::size_t size = 0;
+  for (const std::string_view part : parts) {
+    size += part.size();
+  }
+  std::string text;
+  text.reserve(size);
+  for (const std::string_view part : parts) {
+    text.append(part);
+  }
+  return text;
+}
+
+}  // namespace SsoClient
+
+#endif

@@ -1,0 +1,41 @@
+#include "support/qname.h"
+
+#include <optional>
+
+#include <ssoclient/exceptions.h>
+
+#include "support/concat.h"
+
+namespace SsoClient {
+
+QNameView ResolveQNameView(const Tarnik::Xml::ElementNode& context, std::string_view name,
+                           std::string_view defaultNamespace) {
+  const std::size_t colon = name.find(':');
+  if (colon == std::string_view::npos) {
+    return {defaultNamespace, name};
+  }
+  const std::string_view prefix = name.substr(0, colon);
+  const std::optional<std::string_view> namespaceUri = context.LookupNamespace(prefix);
+  if (!namespaceUri) {
+    throw ParseException(
+        Concat({"Element ", context.QualifiedNameText(), "at ", std::to_string(context.Line()), ",",
+                std::to_string(context.Column()), " uses undefined prefix: `", prefix, "'"}));
+  }
+  return {*namespaceUri, name.substr(colon + 1)};
+}
+
+QName ResolveQName(const Tarnik::Xml::ElementNode& context, std::string_view name,
+                   std::string_view defaultNamespace) {
+  const QNameView view = ResolveQNameView(context, name, defaultNamespace);
+  return {std::string(view.namespaceUri), std::string(view.localName)};
+}
+
+QNameView ResolveQNameValue(const Tarnik::Xml::ElementNode& context, std::string_view name) {
+  // The default namespace is asked for by names without a prefix alone: that takes a walk to the
+  // root.
+  const bool isPrefixed = name.find(':') != std::string_view::npos;
+  return ResolveQNameView(context, name,
+                          isPrefixed ? "" : context.LookupNamespace("").value_or(""));
+}
+
+}  // namespace SsoClient

@@ -1,0 +1,41 @@
+#ifndef SSOCLIENT_SUPPORT_QNAME_H
+#define SSOCLIENT_SUPPORT_QNAME_H
+
+#include <string>
+#include <string_view>
+
+#include <tarnik/xml/element_node.h>
+
+namespace SsoClient {
+
+/// An expanded name (Namespaces in XML 1.0, section 2.1).
+struct QName {
+  std::string namespaceUri;
+  std::string localName;
+
+  friend bool operator==(const QName&, const QName&) = default;
+};
+
+/// The same, looking into the tree and the name that it was made from.
+struct QNameView {
+  std::string_view namespaceUri;
+  std::string_view localName;
+
+  friend bool operator==(const QNameView&, const QNameView&) = default;
+};
+
+/// Resolves a qualified name by the namespaces in scope at `context`; one without a colon belongs
+/// to `defaultNamespace`. The prefix ends at the first colon. Throws `ParseException` for a prefix
+/// that nothing binds.
+QName ResolveQName(const Tarnik::Xml::ElementNode& context, std::string_view name,
+                   std::string_view defaultNamespace);
+QNameView ResolveQNameView(const Tarnik::Xml::ElementNode& context, std::string_view name,
+                           std::string_view defaultNamespace);
+
+/// Resolves a QName that is the value of an attribute of `context`: without a prefix it belongs to
+/// the default namespace in scope (XML Schema Part 2, section 3.2.18).
+QNameView ResolveQNameValue(const Tarnik::Xml::ElementNode& context, std::string_view name);
+
+}  // namespace SsoClient
+
+#endif
