@@ -6,17 +6,15 @@
 
 namespace SsoClient {
 
-/// One attribute carried by an advice. Name and values may be empty texts, and there may be no
-/// value at all.
+/// One attribute of an advice. The name and the values may be empty, and there may be no values.
 struct AdviceAttribute {
   std::string name;                 ///< the attribute's name
   std::vector<std::string> values;  ///< its values, in order
 };
 
-/// A block of advice that a token request carries and a token returns (SAML 2.0 core, section
-/// 2.6.1).
+/// A block of advice in a token request and in the issued token (SAML 2.0 core, section 2.6.1).
 struct Advice {
-  std::string source;                       ///< who gives the advice: AdviceSource
+  std::string source;                       ///< the author of the advice: AdviceSource
   std::vector<AdviceAttribute> attributes;  ///< in order
 };
 

@@ -5,7 +5,7 @@
 
 namespace SsoClient {
 
-/// How the subject of a requested token is to be confirmed. Only zero and non-zero are told apart.
+/// How the subject of a requested token is to be confirmed. All non-zero values mean the same.
 enum ConfirmationType : std::int32_t {
   /// Holder-of-key when the service has a holder-of-key configuration, bearer otherwise (KeyType,
   /// WS-Trust 1.3, section 9.2).
@@ -16,9 +16,10 @@ enum ConfirmationType : std::int32_t {
 
 /// How the subject of an issued token is confirmed (SAML 2.0 profiles, section 3).
 enum TokenConfirmationType : std::int32_t {
-  /// "urn:oasis:names:tc:SAML:2.0:cm:bearer": whoever has the token is taken for its subject.
+  /// "urn:oasis:names:tc:SAML:2.0:cm:bearer": whoever presents the token counts as its subject.
   BEARER = 0,
-  /// "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key": only who proves to have the key is.
+  /// "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key": only whoever proves possession of the key
+  /// does.
   HOLDER_OF_KEY = 1,
 };
 

@@ -9,8 +9,8 @@ namespace SsoClient {
 /// One link of a token's delegation chain (SAML 2.0 Condition for Delegation Restriction, section
 /// 2).
 struct Delegate {
-  PrincipalId delegate;                        ///< to whom the subject was delegated
-  Tarnik::System::DateTime delegationInstant;  ///< when, in UTC
+  PrincipalId delegate;                        ///< who may act for the subject
+  Tarnik::System::DateTime delegationInstant;  ///< since when, in UTC
 };
 
 }  // namespace SsoClient

@@ -10,7 +10,7 @@
 
 namespace SsoClient {
 
-/// Base of all of the library's own failures.
+/// Base of all exceptions that the library defines.
 class SSOCLIENT_EXPORT SsoException : public Tarnik::Exception {
  public:
   explicit SsoException(std::string message,
@@ -23,8 +23,8 @@ class SSOCLIENT_EXPORT SsoException : public Tarnik::Exception {
   [[noreturn]] void Throw() const override { throw SsoException(*this); }
 };
 
-/// The transport or the HTTP exchange with the service failed: connection, TLS, time-out, or an
-/// HTTP status that is no answer.
+/// The exchange with the service failed: connection, TLS, time-out, or an HTTP status other than
+/// 2xx and 500.
 class SSOCLIENT_EXPORT CommunicationException : public SsoException {
  public:
   explicit CommunicationException(std::string message,
@@ -63,7 +63,7 @@ class SSOCLIENT_EXPORT PasswordExpiredException : public SsoException {
   [[noreturn]] void Throw() const override { throw PasswordExpiredException(*this); }
 };
 
-/// Base of every failure to accept a token; raised only through its two subclasses.
+/// Base of every failure to accept a token. Only its two subclasses are thrown.
 class SSOCLIENT_EXPORT InvalidTokenException : public SsoException {
  public:
   explicit InvalidTokenException(std::string message,
@@ -76,7 +76,7 @@ class SSOCLIENT_EXPORT InvalidTokenException : public SsoException {
   [[noreturn]] void Throw() const override { throw InvalidTokenException(*this); }
 };
 
-/// The token's XML breaks the accepted structure, or a validity rule fails.
+/// The token's XML does not have the accepted structure, or a validity rule fails.
 class SSOCLIENT_EXPORT ParseException : public InvalidTokenException {
  public:
   explicit ParseException(std::string message,

@@ -1,7 +1,7 @@
 #ifndef SSOCLIENT_EXPORT_H
 #define SSOCLIENT_EXPORT_H
 
-/// Marks what libssoclient.so exports; everything else stays hidden.
+/// Marks what libssoclient.so exports; everything else is hidden.
 #define SSOCLIENT_EXPORT __attribute__((visibility("default")))
 
 #endif

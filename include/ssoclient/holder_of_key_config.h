@@ -7,11 +7,11 @@
 
 namespace SsoClient {
 
-/// The key that a service proves to possess, so that tokens can be bound to it. Neither may be
-/// null.
+/// The key that a service proves possession of, so that tokens can be bound to it. Neither field
+/// may be null.
 struct HolderOfKeyConfig {
-  /// The client's certificate, which requests carry. Signing is refused before and after its
-  /// period of validity, give or take 600 seconds.
+  /// The client's certificate, which is sent in requests. Signing is refused outside its period of
+  /// validity, with a tolerance of 600 seconds.
   Tarnik::Ref<const Tarnik::Crypto::Certificate> certificate;
   /// The certificate's private key: RSA of at least 2048 bits. Used only to sign.
   Tarnik::Ref<const Tarnik::Crypto::PrivateKey> privateKey;

@@ -12,8 +12,8 @@ struct PrincipalId {
   std::string name;    ///< account or group name
   std::string domain;  ///< the domain that the name belongs to
 
-  /// True when both are one object, or name and domain are equal without regard to ASCII letter
-  /// case. As C strings: what stands behind a NUL does not count.
+  /// Returns true when name and domain are equal, ignoring ASCII letter case. They are compared as
+  /// C strings: only up to the first NUL.
   SSOCLIENT_EXPORT bool operator==(const PrincipalId& other) const;
 };
 

@@ -8,17 +8,17 @@
 
 namespace SsoClient {
 
-/// Creates tokens for those who do not know the keys. Owned through `std::shared_ptr`, which
-/// deletes the implementation. Implementations must be safe to use from many threads. The order of
-/// the operations is part of the binary interface.
+/// Creates tokens for code that does not know the keys. Owned by a `std::shared_ptr` to the
+/// concrete class. Implementations must be safe to use from many threads. The order of the
+/// operations is part of the binary interface.
 class SamlTokenFactory {
  public:
-  /// As the function `CreateSamlToken`, with a tolerance of 600 seconds where none is given, and
-  /// throws what it throws.
+  /// Does what the function `CreateSamlToken` does and throws what it throws. The default tolerance
+  /// is 600 seconds.
   virtual std::shared_ptr<const SamlToken> CreateToken(const std::string& xml) const = 0;
   virtual std::shared_ptr<const SamlToken> CreateToken(const std::string& xml,
                                                        long clockToleranceSec) const = 0;
-  /// As the function `CreateSamlTokenFromDom`.
+  /// The same for the function `CreateSamlTokenFromDom`.
   virtual std::shared_ptr<const SamlToken> CreateToken(
       Tarnik::Xml::ElementNode* assertion) const = 0;
   virtual std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode* assertion,
@@ -28,8 +28,8 @@ class SamlTokenFactory {
   ~SamlTokenFactory() = default;
 };
 
-/// A factory that verifies every token's signature with `resolver`, to which it keeps a reference.
-/// A null resolver gives a factory that verifies no signature.
+/// Creates a factory that verifies every token's signature with `resolver`, to which it keeps a
+/// reference. With a null resolver, the factory does NOT verify signatures.
 SSOCLIENT_EXPORT std::shared_ptr<SamlTokenFactory> CreateSamlTokenFactory(
     const Tarnik::Xml::Security::KeyInfoResolver* resolver);
 

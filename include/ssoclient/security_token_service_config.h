@@ -15,35 +15,35 @@
 
 namespace SsoClient {
 
-/// What a service needs to know. Read once, when the service is created; the service keeps its own
-/// references to the objects that it uses.
+/// The configuration of a service. Read once, when the service is created; the service keeps its
+/// own references to the objects that it uses.
 struct SecurityTokenServiceConfig {
   /// The service's URL, http or https.
   std::string url;
-  /// The source of the keys that verify tokens outside of `tokenFactory`. A service does not read
-  /// it: what it verifies, it verifies through `tokenFactory`.
+  /// The source of the keys that verify tokens where there is no `tokenFactory`. A service ignores
+  /// it: it verifies tokens only through `tokenFactory`.
   const Tarnik::Xml::Security::KeyInfoResolver* keyInfoResolver = nullptr;
-  /// Turns answered assertions into verified tokens; must not be null.
+  /// Creates verified tokens from the service's answers; must not be null.
   std::shared_ptr<SamlTokenFactory> tokenFactory;
-  /// The name that the service's TLS certificate must carry; the URL's host if empty.
+  /// The name that the service's TLS certificate must have; the URL's host if empty.
   std::string sslPeerName;
   /// The key for holder-of-key tokens. Without it all tokens are bearer tokens, and the operations
   /// by certificate, by token and to renew are refused.
   boost::optional<HolderOfKeyConfig> holderOfKeyConfig;
-  /// Whom to trust with TLS; may be null for a plain http URL.
+  /// The TLS trust and settings; may be null for an http URL.
   Tarnik::Ssl::SSLContext* sslContext = nullptr;
-  /// Look for a replacement host before each connection. No source of replacements is built in, so
-  /// connections go to the URL's host either way.
+  /// Whether to look for a replacement host before each connection. There is no source of
+  /// replacements yet, so connections go to the URL's host either way.
   bool flag = false;
 };
 
-/// The same for callers that bring their own HTTP user agent.
+/// The same for callers with their own HTTP user agent.
 struct SecurityTokenServiceConfigEx {
-  /// The request target of every POST, used as it stands.
+  /// The request target of every POST, used unchanged.
   std::string url;
   /// Shared by all exchanges of the service; knows where and how to connect. Must not be null.
   Tarnik::Ref<Tarnik::Http::UserAgent> userAgent;
-  /// Turns answered assertions into verified tokens; must not be null.
+  /// Creates verified tokens from the service's answers; must not be null.
   std::shared_ptr<SamlTokenFactory> tokenFactory;
   /// As above.
   boost::optional<HolderOfKeyConfig> holderOfKeyConfig;

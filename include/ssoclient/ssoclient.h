@@ -1,7 +1,7 @@
 #ifndef SSOCLIENT_SSOCLIENT_H
 #define SSOCLIENT_SSOCLIENT_H
 
-// Everything that the library offers.
+// Includes the whole public interface.
 
 #include <ssoclient/advice.h>
 #include <ssoclient/confirmation_type.h>
@@ -16,5 +16,9 @@
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/security_token_service_config.h>
 #include <ssoclient/token_spec.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/xml/security/xml_security_exception.h>
+#include <tarnik/xml/xml_parse_exception.h>
 
 #endif

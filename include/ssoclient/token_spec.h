@@ -15,22 +15,22 @@ namespace SsoClient {
 
 class SamlToken;
 
-/// What token a caller asks the security token service for. A plain value.
+/// The token that a caller requests from the security token service. A plain value.
 struct TokenSpec {
-  /// Requested lifetime in seconds from now on; must be positive. One that leaves the calendar ends
-  /// with the year 9999.
+  /// The requested lifetime in seconds from now; must be positive. The expiration time is limited
+  /// to the year 9999.
   std::int64_t tokenLifetimeSec = 0;
-  /// Audiences that the token is to be restricted to; none if empty.
+  /// The audiences that the token is to be restricted to; not restricted if empty.
   std::set<std::string> audienceRestriction;
-  /// Advice that the token is to carry.
+  /// The advice that the token is to contain.
   std::vector<Advice> advice;
-  /// Ask for a token that may be delegated.
+  /// Whether the token may be delegated.
   bool delegable = false;
   /// The principal to whom the token is to be delegated.
   boost::optional<std::string> delegateTo;
-  /// A token on whose behalf the request is made; must not be null if set.
+  /// The token on behalf of whose subject the request is made; must not be null if set.
   boost::optional<std::shared_ptr<const SamlToken>> actAsToken;
-  /// Ask for a token that may be renewed.
+  /// Whether the token may be renewed.
   bool renewable = false;
   /// How the token's subject is to be confirmed.
   ConfirmationType confirmation = CONFIRMATION_DEFAULT;

@@ -9,8 +9,8 @@
 
 namespace SsoClient {
 
-/// Binds an object of the caller's to an asynchronous call by reference, where other arguments are
-/// copied: the caller keeps it alive until the callback has run.
+/// Passes an argument to an asynchronous call by reference, where other arguments are copied. The
+/// caller keeps the object alive until the callback has returned.
 template <class T>
 class PassByRefHelper {
  public:
@@ -21,10 +21,10 @@ class PassByRefHelper {
   T* object_;
 };
 
-/// Runs `operation` on a worker thread of the platform's pool and returns at once. `callback` then
-/// gets the result and null, or an empty result and the platform exception that the operation
-/// threw, valid only during the call. Exceptions of other types, and those of the callback, leave
-/// the work item.
+/// Runs `operation` on a worker thread of the platform's pool and returns immediately. `callback`
+/// then receives the result and null, or an empty result and the platform exception that the
+/// operation threw, which is valid only during the call. Exceptions of other types, and those of
+/// the callback, propagate out of the work item.
 ///
 /// Throws `Tarnik::InvalidArgumentException` when `callback` is empty.
 template <class Result>

@@ -16,24 +16,19 @@ using Tarnik::System::DateTime;
 
 constexpr int kMinRsaBits = 2048;  // NIST SP 800-131A
 
-void Require(bool isGood, const char* complaint) {
-  if (!isGood) {
+void Require(bool condition, const char* complaint) {
+  if (!condition) {
     throw Tarnik::InvalidArgumentException(std::string("HolderOfKeyConfig: ") + complaint);
   }
 }
 
-bool BelongTogether(const HolderOfKeyConfig& config) {
+bool KeyMatchesCertificate(const HolderOfKeyConfig& config) {
   try {
     return config.privateKey->Matches(*config.certificate);
   } catch (const Tarnik::Crypto::CryptoException& error) {
     throw Tarnik::InvalidArgumentException("HolderOfKeyConfig: the certificate cannot be used: " +
                                            error.Message());
   }
-}
-
-DateTime SecondsLater(const DateTime& time, long seconds) {
-  return Tarnik::System::DateTimeFromUtc(
-      Tarnik::System::SaturatingAdd(time.GetUtcTime(), seconds * 1'000'000), false);
 }
 
 std::string Describe(const Tarnik::Crypto::Certificate& certificate) {
@@ -48,9 +43,9 @@ void CheckHolderOfKeyConfig(const boost::optional<HolderOfKeyConfig>& config) {
   }
   Require(config->certificate != nullptr, "the certificate must not be null.");
   Require(config->privateKey != nullptr, "the private key must not be null.");
-  Require(BelongTogether(*config), "the private key does not belong to the certificate.");
+  Require(KeyMatchesCertificate(*config), "the private key does not belong to the certificate.");
   const auto key = config->privateKey->GetPublicKey();
-  // The key may be of the caller's own making.
+  // The caller may implement the key.
   Require(key != nullptr, "the private key has no public half.");
   Require(key->Algorithm() == KeyAlgorithm::kRsa,
           "the key must be an RSA key, since requests are signed with RSA-SHA256.");
@@ -58,11 +53,11 @@ void CheckHolderOfKeyConfig(const boost::optional<HolderOfKeyConfig>& config) {
 }
 
 void CheckPeriodOfValidity(const Tarnik::Crypto::Certificate& certificate, const DateTime& now) {
-  if (now < SecondsLater(certificate.NotBefore(), -kDefaultClockToleranceSec)) {
+  if (now < AddSeconds(certificate.NotBefore(), -kDefaultClockToleranceSec)) {
     throw Tarnik::InvalidStateException(Describe(certificate) + " is not valid before " +
                                         certificate.NotBefore().ToString());
   }
-  if (now > SecondsLater(certificate.NotAfter(), kDefaultClockToleranceSec)) {
+  if (now > AddSeconds(certificate.NotAfter(), kDefaultClockToleranceSec)) {
     throw Tarnik::InvalidStateException(Describe(certificate) + " expired at " +
                                         certificate.NotAfter().ToString());
   }

@@ -8,14 +8,14 @@
 
 namespace SsoClient {
 
-/// Judges what a service is given to sign with, so that a mistake is not found out by the first
-/// request that the security token service refuses. Throws `Tarnik::InvalidArgumentException` when
-/// a part is null, the certificate's key cannot be read, the private key is not that key's, or it
-/// cannot sign RSA-SHA256; nothing without a configuration.
+/// Validates what a service is to sign with, so that a mistake is found before the security token
+/// service refuses a request. Throws `Tarnik::InvalidArgumentException` when a part is null, the
+/// certificate's key cannot be read, the private key does not belong to the certificate, or it
+/// cannot sign RSA-SHA256. Accepts an absent configuration.
 void CheckHolderOfKeyConfig(const boost::optional<HolderOfKeyConfig>& config);
 
-/// Throws `Tarnik::InvalidStateException` when `certificate` is not valid at `now`, with a
-/// tolerance of 600 seconds for clocks that differ.
+/// Throws `Tarnik::InvalidStateException` when `certificate` is not valid at `now`, within the
+/// default clock tolerance.
 void CheckPeriodOfValidity(const Tarnik::Crypto::Certificate& certificate,
                            const Tarnik::System::DateTime& now);
 

@@ -7,17 +7,17 @@
 
 namespace SsoClient {
 
-/// The library's one logger, named "SsoClient".
+/// The library's only logger, named "SsoClient".
 extern const Tarnik::Service::StaticLogger kLogger;
 
 /// The level of the lines that trace operations and requests.
 inline constexpr int kTraceLevel = 7;
-/// The level of the lines that warn of what a caller did.
+/// The level of the lines that warn about a mistake of the caller.
 inline constexpr int kWarningLevel = 4;
-/// The level of the lines that tell of a success.
+/// The level of the lines that report a success.
 inline constexpr int kSuccessLevel = 5;
 
-/// Logs that an operation starts, and when it is left, however it is left, that it ends.
+/// Logs the start of an operation and, on every path out of it, its end.
 class OperationLog {
  public:
   /// `operation` must outlive this object.

@@ -12,15 +12,15 @@
 
 namespace SsoClient {
 
-/// The parts that a negotiation works with.
+/// What a negotiation uses to build, send and read its legs.
 struct NegotiationParts {
   const RequestBuilder& requestBuilder;
   const TransportSession& session;
   const ResponseHandler& responseHandler;
 };
 
-/// Sends one leg of a negotiation and returns the answer: a request for a token by `spec` while
-/// `contextId` is empty, and after that a continuation of the negotiation that it names.
+/// Sends one leg of a negotiation and returns the answer. With an empty `contextId` the leg opens a
+/// negotiation for a token by `spec`; otherwise it continues the negotiation with that id.
 NegotiationResponse SendNegotiationLeg(const NegotiationParts& parts, const TokenSpec& spec,
                                        const std::string& contextId,
                                        const std::vector<unsigned char>& leg);

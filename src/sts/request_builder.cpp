@@ -4,25 +4,20 @@
 
 #include <tarnik/core/exception.h>
 #include <tarnik/core/writer.h>
+#include <tarnik/text/string_util.h>
 #include <tarnik/xml/xml_writer.h>
 
 #include "sts/holder_of_key_check.h"
 #include "xml/request_bodies.h"
 #include "xml/security_header.h"
 #include "xml/signed_envelope.h"
+#include "xml/ws_trust_names.h"
 
 namespace SsoClient {
 
 namespace {
 
 using Builder = std::shared_ptr<XMLBaseBuilder>;
-
-constexpr char kIssueAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
-constexpr char kRenewAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Renew";
-constexpr char kValidateAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Validate";
-
-constexpr char kContinuedNegotiationAction[] =
-    "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RSTR/Issue";
 
 constexpr char kByCertificate[] = "acquire token by certificate";
 constexpr char kByToken[] = "acquire token by token";
@@ -50,7 +45,7 @@ void CheckHolderOfKeyToken(const SamlToken& token, const std::string& operation)
   }
 }
 
-// The security header with a token behind the timestamp.
+// The security header with a token after the timestamp.
 Builder BuildHeader(Builder token = nullptr) {
   auto header = std::make_shared<XMLCompositeBuilder>(BuildSecurityHeader(kTimestampMinutes));
   header->Add(std::move(token));
@@ -96,7 +91,7 @@ void RequestBuilderImpl::BuildAcquireTokenRequest(const std::string& userName,
   CheckLifetime(spec.tokenLifetimeSec);
   const auto header = BuildHeader(BuildUsernamePasswordToken(userName, password));
   const auto body = BuildIssueBodyWithUseKey(KeyTypeFor(spec), spec);
-  Assign(kIssueAction, Enclose(spec, header, body), request);
+  Assign(kWsTrust13.issueAction, Enclose(spec, header, body), request);
 }
 
 void RequestBuilderImpl::BuildInitialNegotiationRequest(const TokenSpec& spec,
@@ -104,14 +99,14 @@ void RequestBuilderImpl::BuildInitialNegotiationRequest(const TokenSpec& spec,
                                                         SoapRequest& request) const {
   CheckLifetime(spec.tokenLifetimeSec);
   const auto body = std::make_shared<XMLBodyBuilderInitialSPNego>(KeyTypeFor(spec), spec, leg);
-  Assign(kIssueAction, Enclose(spec, BuildHeader(), body), request);
+  Assign(kWsTrust13.issueAction, Enclose(spec, BuildHeader(), body), request);
 }
 
 void RequestBuilderImpl::BuildContinuedNegotiationRequest(const std::string& contextId,
                                                           const std::vector<unsigned char>& leg,
                                                           SoapRequest& request) const {
   const auto body = std::make_shared<XMLBodyBuilderContinuedSPNego>(contextId, leg);
-  Assign(kContinuedNegotiationAction, BuildEnvelope(BuildHeader(), body), request);
+  Assign(kWsTrust13.continuedIssueAction, BuildEnvelope(BuildHeader(), body), request);
 }
 
 void RequestBuilderImpl::BuildAcquireTokenByCertificateRequest(const TokenSpec& spec,
@@ -120,7 +115,7 @@ void RequestBuilderImpl::BuildAcquireTokenByCertificateRequest(const TokenSpec& 
   const HolderOfKeyConfig& config = RequireHolderOfKey(kByCertificate);
   CheckDefaultConfirmation(spec, kByCertificate);
   const auto body = BuildIssueBodyWithUseKey(KeyTypeFor(spec), spec);
-  Assign(kIssueAction, SignByCertificate(config, BuildHeader(), body), request);
+  Assign(kWsTrust13.issueAction, SignByCertificate(config, BuildHeader(), body), request);
 }
 
 void RequestBuilderImpl::BuildAcquireTokenByTokenRequest(const SamlToken& token,
@@ -130,11 +125,12 @@ void RequestBuilderImpl::BuildAcquireTokenByTokenRequest(const SamlToken& token,
   const HolderOfKeyConfig& config = RequireHolderOfKey(kByToken);
   const auto header = BuildHeader(MakeTokenElementBuilder(token));
   const auto body = BuildIssueBody(KeyTypeFor(spec), spec);
-  Assign(kIssueAction, SignByToken(config, header, body, token), request);
+  Assign(kWsTrust13.issueAction, SignByToken(config, header, body, token), request);
 }
 
 void RequestBuilderImpl::BuildValidateRequest(const SamlToken& token, SoapRequest& request) const {
-  Assign(kValidateAction, BuildEnvelope(BuildHeader(), BuildValidateBody(token)), request);
+  Assign(kWsTrust13.validateAction, BuildEnvelope(BuildHeader(), BuildValidateBody(token)),
+         request);
 }
 
 void RequestBuilderImpl::BuildRenewRequest(const SamlToken& token, std::int64_t lifetimeSec,
@@ -143,7 +139,7 @@ void RequestBuilderImpl::BuildRenewRequest(const SamlToken& token, std::int64_t 
   const HolderOfKeyConfig& config = RequireHolderOfKey(kRenew);
   CheckHolderOfKeyToken(token, kRenew);
   const auto body = BuildRenewBody(token, lifetimeSec);
-  Assign(kRenewAction, SignByCertificate(config, BuildHeader(), body), request);
+  Assign(kWsTrust13.renewAction, SignByCertificate(config, BuildHeader(), body), request);
 }
 
 const HolderOfKeyConfig& RequestBuilderImpl::RequireHolderOfKey(
@@ -162,8 +158,7 @@ unsigned RequestBuilderImpl::KeyTypeFor(const TokenSpec& spec) const {
   return AsksForHolderOfKey(spec) ? 1 : 0;
 }
 
-// A request on behalf of another's token is not signed, even when it asks for a holder-of-key
-// token.
+// A request with an act-as token is not signed, even when it asks for a holder-of-key token.
 std::shared_ptr<XMLBaseBuilder> RequestBuilderImpl::Enclose(
     const TokenSpec& spec, const std::shared_ptr<XMLBaseBuilder>& header,
     const std::shared_ptr<XMLBaseBuilder>& body) const {

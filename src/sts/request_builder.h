@@ -17,12 +17,13 @@
 
 namespace SsoClient {
 
-/// Makes the requests of a service's operations. Safe from many threads.
+/// Builds the requests of a service's operations. Safe from many threads.
 ///
-/// In each operation `request` is assigned only on success. Each throws
-///  - `Tarnik::InvalidArgumentException` when a lifetime is not positive, when a text cannot be
-///    sent: the message then names its element, never the text; and when a token carries an id of
-///    the signed request itself;
+/// Each operation assigns `request` only on success, and throws
+///  - `Tarnik::InvalidArgumentException` when a lifetime is not positive, when XML cannot represent
+///  a
+///    text (the message names the element, never the text), and when a token has an id of the
+///    signed request itself;
 ///  - `Tarnik::InvalidStateException` when a key is needed and there is none, and when the
 ///    certificate of the key is not valid now;
 ///  - `Tarnik::Xml::XMLParseException` when the text of a presented token is malformed;
@@ -32,18 +33,18 @@ class RequestBuilder {
   /// A token by user name and password; signed if the token is to be bound to the key.
   virtual void BuildAcquireTokenRequest(const std::string& userName, const std::string& password,
                                         const TokenSpec& spec, SoapRequest& request) const = 0;
-  /// The first leg of a negotiation for a token; signed as a request by password is.
+  /// The first leg of a negotiation for a token; signed under the same condition.
   virtual void BuildInitialNegotiationRequest(const TokenSpec& spec,
                                               const std::vector<unsigned char>& leg,
                                               SoapRequest& request) const = 0;
-  /// A later leg of the negotiation that the service named `contextId`.
+  /// A later leg of the negotiation to which the service assigned `contextId`.
   virtual void BuildContinuedNegotiationRequest(const std::string& contextId,
                                                 const std::vector<unsigned char>& leg,
                                                 SoapRequest& request) const = 0;
-  /// A token by the certificate of the key. The spec's confirmation must be the default one.
+  /// A token by the certificate of the key. The spec's confirmation must be the default.
   virtual void BuildAcquireTokenByCertificateRequest(const TokenSpec& spec,
                                                      SoapRequest& request) const = 0;
-  /// A token on the strength of `token`, which is bound to the key.
+  /// A token by `token`, which is bound to the key.
   virtual void BuildAcquireTokenByTokenRequest(const SamlToken& token, const TokenSpec& spec,
                                                SoapRequest& request) const = 0;
   /// The status of `token`.
@@ -56,7 +57,7 @@ class RequestBuilder {
   ~RequestBuilder() = default;
 };
 
-/// Builds requests, and signs with a key those that prove its possession.
+/// Builds requests and signs those that prove possession of the key.
 class RequestBuilderImpl final : public RequestBuilder {
  public:
   explicit RequestBuilderImpl(boost::optional<HolderOfKeyConfig> holderOfKeyConfig);
@@ -79,10 +80,10 @@ class RequestBuilderImpl final : public RequestBuilder {
  private:
   const HolderOfKeyConfig& RequireHolderOfKey(const std::string& operation) const;
   bool AsksForHolderOfKey(const TokenSpec& spec) const;
-  /// The key type that the body of a request asks for, as `BuildIssueBody` takes it.
+  /// The key type that a request's body asks for, as `BuildIssueBody` expects it.
   unsigned KeyTypeFor(const TokenSpec& spec) const;
-  /// The envelope of a request that proves who asks by other means than the key: signed when the
-  /// token is to be bound to the key.
+  /// The envelope of a request whose sender is authenticated by other means than the key. It is
+  /// signed when the token is to be bound to the key.
   std::shared_ptr<XMLBaseBuilder> Enclose(const TokenSpec& spec,
                                           const std::shared_ptr<XMLBaseBuilder>& header,
                                           const std::shared_ptr<XMLBaseBuilder>& body) const;

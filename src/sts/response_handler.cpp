@@ -1,40 +1,29 @@
 #include "sts/response_handler.h"
 
 #include <string_view>
-#include <utility>
 
 #include <ssoclient/exceptions.h>
-#include <tarnik/core/checked_cast.h>
 #include <tarnik/text/string_util.h>
-#include <tarnik/xml/document.h>
 #include <tarnik/xml/xml_parse_exception.h>
-#include <tarnik/xml/xml_parser.h>
 
-#include "sts/response_reading.h"
+#include "sts/soap_fault.h"
 #include "support/namespaces.h"
+#include "support/xml_documents.h"
+#include "xml/ws_trust_names.h"
 
 namespace SsoClient {
 
 namespace {
 
-using Tarnik::Xml::Document;
 using Tarnik::Xml::ElementNode;
-
-constexpr std::string_view kStatusValid =
-    "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid";
-constexpr std::string_view kStatusInvalid =
-    "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid";
 
 [[noreturn]] void ThrowUnexpectedFormat() {
   throw SsoException("Unexpected XML format");
 }
 
-Tarnik::Ref<Document> ParseDocument(Tarnik::Reader* response) {
-  const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
-  const auto parser = Tarnik::Xml::CreateXMLParser(response, handler.get());
+Tarnik::Ref<Tarnik::Xml::Document> ParseResponse(Tarnik::Reader* response) {
   try {
-    const auto parsed = parser->Parse();
-    return Tarnik::CheckedCast<Document>(parsed.get());
+    return ParseDocument(response);
   } catch (const Tarnik::Xml::XMLParseException& error) {
     throw SsoException("Response is not well-formed XML: " + error.Message());
   }
@@ -42,7 +31,7 @@ Tarnik::Ref<Document> ParseDocument(Tarnik::Reader* response) {
 
 template <class BodyParser>
 auto ParseSoapResponse(Tarnik::Reader* response, const BodyParser& parseBody) {
-  const auto document = ParseDocument(response);
+  const auto document = ParseResponse(response);
   const ElementNode& envelope = *document->RootElement();
   CheckSoapFault(envelope);
   const ElementNode* body = envelope.FirstChildElement("Body");
@@ -77,10 +66,10 @@ bool ParseValidateBody(const ElementNode& body) {
   if (code == nullptr) {
     ThrowUnexpectedFormat();
   }
-  if (code->Text() == kStatusValid) {
+  if (code->Text() == kWsTrust13.validStatus) {
     return true;
   }
-  if (code->Text() == kStatusInvalid) {
+  if (code->Text() == kWsTrust13.invalidStatus) {
     return false;
   }
   ThrowUnexpectedFormat();

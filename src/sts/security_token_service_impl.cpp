@@ -28,7 +28,7 @@ Tarnik::PrintFormatter Printed(const Value& value) {
   return value;
 }
 
-// Describes the arguments only when the line is written.
+// Formats the arguments only when the line is written.
 template <class... Arguments>
 void Log(int level, std::string_view format, const Arguments&... arguments) {
   if (kLogger.IsEnabled(level)) {
@@ -46,8 +46,8 @@ std::shared_ptr<const std::vector<unsigned char>> NextLeg(
   return leg;
 }
 
-// No mechanism takes more than a few. A service may answer on and on without a byte of its own, and
-// a handler then begin anew each time, so that nobody else would ever end the loop.
+// No mechanism takes more than a few legs. A service may go on answering with empty legs while the
+// handler starts again each time, and then nothing else would end the loop.
 constexpr int kMaxLegs = 1000;
 
 void CountLeg(int& legs) {
@@ -64,7 +64,7 @@ void CheckContextId(const NegotiationResponse& answer) {
   }
 }
 
-// The line says the opposite of what it is written for; readers of logs know it as it is.
+// The text says the opposite of its condition; readers of logs depend on it as it is.
 void HandOverLastLeg(NegotiationHandler& handler, const std::vector<unsigned char>& serverLeg) {
   if (serverLeg.empty()) {
     return;
@@ -161,7 +161,7 @@ TokenHandle SecurityTokenServiceImpl::RenewToken(const SamlToken& token,
 void SecurityTokenServiceImpl::AcquireTokenAsync(const std::string& userName,
                                                  const std::string& password, const TokenSpec& spec,
                                                  TokenCallback callback) const {
-  // Shared, since a work item is copied about: the password then stands in memory only once, and is
+  // Shared, because a work item is copied: the password is then in memory only once, and is
   // cleansed with the last copy.
   SyncToAsyncCall<TokenHandle>(
       [service = Copy(), userName, secret = std::make_shared<const SecretText>(password), spec] {

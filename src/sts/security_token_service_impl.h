@@ -12,7 +12,7 @@
 
 namespace SsoClient {
 
-/// Asks a service through four parts, none of which may be null. Copies share the parts.
+/// Uses four parts, none of which may be null. Copies share the parts.
 class SecurityTokenServiceImpl final : public SecurityTokenService {
  public:
   SecurityTokenServiceImpl(std::shared_ptr<const RequestBuilder> requestBuilder,
@@ -44,7 +44,7 @@ class SecurityTokenServiceImpl final : public SecurityTokenService {
                        TokenCallback callback) const override;
 
  private:
-  /// What an asynchronous call works with: it may outlive this object.
+  /// What an asynchronous call uses, since it may outlive this object.
   std::shared_ptr<const SecurityTokenServiceImpl> Copy() const;
   Tarnik::Ref<Tarnik::Reader> Send(const SoapRequest& request) const;
   std::shared_ptr<const SamlToken> MakeIssuedToken(Tarnik::Reader* response) const;

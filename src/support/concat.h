@@ -7,7 +7,7 @@
 
 namespace SsoClient {
 
-/// The parts, one behind the other.
+/// Returns the parts joined in order, with one allocation.
 inline std::string Concat(std::initializer_list<std::string_view> parts) {
   std::size_t size = 0;
   for (const std::string_view part : parts) {

@@ -31,8 +31,7 @@ QName ResolveQName(const Tarnik::Xml::ElementNode& context, std::string_view nam
 }
 
 QNameView ResolveQNameValue(const Tarnik::Xml::ElementNode& context, std::string_view name) {
-  // The default namespace is asked for by names without a prefix alone: that takes a walk to the
-  // root.
+  // Only a name without a prefix needs the default namespace: looking it up walks to the root.
   const bool isPrefixed = name.find(':') != std::string_view::npos;
   return ResolveQNameView(context, name,
                           isPrefixed ? "" : context.LookupNamespace("").value_or(""));

@@ -16,7 +16,7 @@ struct QName {
   friend bool operator==(const QName&, const QName&) = default;
 };
 
-/// The same, looking into the tree and the name that it was made from.
+/// The same as views into the tree and the name that it was made from.
 struct QNameView {
   std::string_view namespaceUri;
   std::string_view localName;
@@ -24,16 +24,16 @@ struct QNameView {
   friend bool operator==(const QNameView&, const QNameView&) = default;
 };
 
-/// Resolves a qualified name by the namespaces in scope at `context`; one without a colon belongs
-/// to `defaultNamespace`. The prefix ends at the first colon. Throws `ParseException` for a prefix
-/// that nothing binds.
+/// Resolves a qualified name by the namespaces in scope at `context`. A name without a colon is in
+/// `defaultNamespace`. The prefix ends at the first colon. Throws `ParseException` for an
+/// undeclared prefix.
 QName ResolveQName(const Tarnik::Xml::ElementNode& context, std::string_view name,
                    std::string_view defaultNamespace);
 QNameView ResolveQNameView(const Tarnik::Xml::ElementNode& context, std::string_view name,
                            std::string_view defaultNamespace);
 
-/// Resolves a QName that is the value of an attribute of `context`: without a prefix it belongs to
-/// the default namespace in scope (XML Schema Part 2, section 3.2.18).
+/// Resolves a QName that is the value of an attribute of `context`. Without a prefix it is in the
+/// default namespace in scope (XML Schema Part 2, section 3.2.18). Throws as above.
 QNameView ResolveQNameValue(const Tarnik::Xml::ElementNode& context, std::string_view name);
 
 }  // namespace SsoClient

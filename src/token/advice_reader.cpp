@@ -14,13 +14,13 @@ namespace {
 using Tarnik::Xml::ElementNode;
 
 AdviceAttribute ReadAdviceAttribute(ChildCursor& cursor) {
-  // A request may ask for advice with empty values: the token that carries them must be readable.
+  // A request may ask for advice with empty values, so a token with such values must be readable.
   const AttributeView view = ReadSamlAttribute(cursor, EmptyValues::kRead);
   return {std::string(view.name), {view.values.begin(), view.values.end()}};
 }
 
 Advice ReadAdviceBlock(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "RSAAdvice", kVendorSamlNamespace);
+  const ElementNode& element = cursor.TakeElement("RSAAdvice", kVendorSamlNamespace);
   CheckAttributes(element, {"AdviceSource"});
   Advice advice;
   advice.source = ReadAttribute(element, "AdviceSource");
@@ -28,21 +28,19 @@ Advice ReadAdviceBlock(ChildCursor& cursor) {
   while (!children.IsAtEnd()) {
     advice.attributes.push_back(ReadAdviceAttribute(children));
   }
-  cursor.Advance();
   return advice;
 }
 
 }  // namespace
 
 std::vector<Advice> ReadAdvice(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "Advice", kSamlNamespace);
+  const ElementNode& element = cursor.TakeElement("Advice", kSamlNamespace);
   CheckAttributes(element, {});
   std::vector<Advice> advice;
   ChildCursor children = cursor.Into(element);
   while (!children.IsAtEnd()) {
     advice.push_back(ReadAdviceBlock(children));
   }
-  cursor.Advance();
   return advice;
 }
 

@@ -9,8 +9,8 @@
 
 namespace SsoClient {
 
-/// Reads an Advice element (SAML 2.0 core, section 2.6.1) that holds the vendor's advice blocks
-/// alone. Throws `ParseException`.
+/// Reads an Advice element (SAML 2.0 core, section 2.6.1), which may contain only the vendor's
+/// advice blocks. Throws `ParseException`.
 std::vector<Advice> ReadAdvice(ChildCursor& cursor);
 
 }  // namespace SsoClient

@@ -44,9 +44,7 @@ ParsedAssertion ReadAssertion(Tarnik::Xml::ElementNode* assertion) {
   parsed.subject = ReadSubject(children);
   parsed.conditions = ReadConditions(children);
   ReadOptionalParts(children, parsed);
-  if (!children.IsAtEnd()) {
-    throw ParseException("Unexpected elements under Assertion");
-  }
+  children.ExpectEnd("Unexpected elements under Assertion");
   return parsed;
 }
 

@@ -8,8 +8,8 @@
 namespace SsoClient {
 
 /// Reads one SAML 2.0 assertion (SAML 2.0 core, section 2.3.3) in the one layout that this library
-/// accepts; whatever it does not expect is an error. Judges neither times nor the signature's
-/// value. `assertion` may be null, which is an error like any other node that is no Assertion.
+/// accepts; anything unexpected is an error. Does not check times or the signature's value. A null
+/// `assertion` is an error like any node that is not an Assertion.
 ///
 /// Throws `ParseException` at the first fault in document order.
 ParsedAssertion ReadAssertion(Tarnik::Xml::ElementNode* assertion);

@@ -19,10 +19,9 @@ std::vector<std::string> ReadAudiences(const ElementNode& restriction, ChildCurs
   CheckAttributes(restriction, {});
   std::vector<std::string> audiences;
   do {
-    const ElementNode& audience = ExpectElement(children.Current(), "Audience", kSamlNamespace);
+    const ElementNode& audience = children.TakeElement("Audience", kSamlNamespace);
     CheckAttributes(audience, {});
     audiences.emplace_back(ReadTextContent(audience));
-    children.Advance();
   } while (!children.IsAtEnd());
   return audiences;
 }
@@ -50,14 +49,13 @@ RenewRestriction ReadRenewRestriction(const ElementNode& condition, const ChildC
 }
 
 Delegate ReadDelegate(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "Delegate", kDelegationNamespace);
+  const ElementNode& element = cursor.TakeElement("Delegate", kDelegationNamespace);
   CheckAttributes(element, {"DelegationInstant"});
   Delegate result;
   result.delegationInstant = ReadDateAttribute(element, "DelegationInstant");
   ChildCursor children = cursor.Into(element);
   result.delegate = ReadPrincipal(children);
   ExpectEmpty(children);
-  cursor.Advance();
   return result;
 }
 
@@ -74,7 +72,7 @@ std::vector<Delegate> ReadDelegationChain(const ElementNode& condition, ChildCur
   throw ParseException("Unknown or duplicate restriction node under Conditions");
 }
 
-// Condition is abstract (SAML 2.0 core, section 2.5.1.3): xsi:type says what it is.
+// Condition is abstract (SAML 2.0 core, section 2.5.1.3): xsi:type names its concrete type.
 void ReadTypedCondition(const ElementNode& condition, const ChildCursor& children,
                         ParsedConditions& conditions) {
   const std::optional<std::string_view> typeName = FindTypeAttribute(condition);
@@ -117,7 +115,7 @@ void ReadRestriction(ChildCursor& cursor, ParsedConditions& conditions) {
 }  // namespace
 
 ParsedConditions ReadConditions(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "Conditions", kSamlNamespace);
+  const ElementNode& element = cursor.TakeElement("Conditions", kSamlNamespace);
   CheckAttributes(element, {"NotBefore", "NotOnOrAfter"});
   ParsedConditions conditions;
   conditions.notBefore = ReadDateAttribute(element, "NotBefore");
@@ -126,7 +124,6 @@ ParsedConditions ReadConditions(ChildCursor& cursor) {
   while (!children.IsAtEnd()) {
     ReadRestriction(children, conditions);
   }
-  cursor.Advance();
   return conditions;
 }
 

@@ -6,9 +6,9 @@
 
 namespace SsoClient {
 
-/// Reads Conditions (SAML 2.0 core, section 2.5.1) with the restrictions that this library
-/// understands, in any order and each at most once. A condition that it does not understand makes
-/// the assertion's validity indeterminate, so it is refused. Throws `ParseException`.
+/// Reads Conditions (SAML 2.0 core, section 2.5.1) with the restrictions that this library knows,
+/// in any order and each at most once. An unknown condition would make the assertion's validity
+/// indeterminate, so it is refused. Throws `ParseException`.
 ParsedConditions ReadConditions(ChildCursor& cursor);
 
 }  // namespace SsoClient

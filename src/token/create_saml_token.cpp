@@ -1,14 +1,11 @@
 #include <utility>
 
+#include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
-#include <tarnik/core/checked_cast.h>
-#include <tarnik/core/reader.h>
-#include <tarnik/core/writer.h>
-#include <tarnik/xml/document.h>
-#include <tarnik/xml/security/canonicalizer.h>
-#include <tarnik/xml/xml_parser.h>
+#include <tarnik/core/exception.h>
 
 #include "support/clock_tolerance.h"
+#include "support/xml_documents.h"
 #include "token/assertion_reader.h"
 #include "token/saml_token_impl.h"
 #include "token/token_signature.h"
@@ -22,32 +19,14 @@ using Tarnik::Xml::ElementNode;
 using Tarnik::Xml::Security::KeyInfoResolver;
 using Token = std::shared_ptr<const SamlToken>;
 
-Ref<Tarnik::Xml::Document> ParseDocument(const std::string& xml) {
-  const Ref<Tarnik::Reader> reader = Tarnik::CreateStringReader(xml);
-  const Ref<Tarnik::Xml::XMLHandler> handler = Tarnik::Xml::CreateXMLDocumentHandler();
-  const Ref<Tarnik::Xml::XMLParser> parser =
-      Tarnik::Xml::CreateXMLParser(reader.get(), handler.get());
-  const Ref<Tarnik::Object> document = parser->Parse();
-  return Ref<Tarnik::Xml::Document>(Tarnik::CheckedCast<Tarnik::Xml::Document>(document.get()));
-}
-
-ParsedAssertion ReadAndJudge(ElementNode* assertion, const KeyInfoResolver* resolver,
-                             long clockToleranceSec) {
+ParsedAssertion ReadAndValidate(ElementNode* assertion, const KeyInfoResolver* resolver,
+                                long clockToleranceSec) {
   ParsedAssertion parsed = ReadAssertion(assertion);
   CheckValidity(parsed, clockToleranceSec, Tarnik::System::GetUtcDateTime());
   if (resolver != nullptr) {
     VerifySignature(*parsed.signature, resolver);
   }
   return parsed;
-}
-
-std::string CanonicalText(const ElementNode* element) {
-  const Ref<Tarnik::Xml::Security::Canonicalizer> canonicalizer =
-      Tarnik::Xml::Security::CreateCanonicalizer(
-          "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#");
-  const Ref<Tarnik::StringWriter> writer = Tarnik::CreateStringWriter();
-  canonicalizer->Canonicalize(element, writer.get());
-  return writer->TakeText();
 }
 
 Token MakeToken(ParsedAssertion&& parsed, std::string xml, long clockToleranceSec) {
@@ -72,7 +51,7 @@ Token CreateSamlToken(const std::string& xml, const KeyInfoResolver* resolver) {
 Token CreateSamlToken(const std::string& xml, const KeyInfoResolver* resolver,
                       long clockToleranceSec) {
   const Ref<Tarnik::Xml::Document> document = ParseDocument(xml);
-  ParsedAssertion parsed = ReadAndJudge(document->RootElement(), resolver, clockToleranceSec);
+  ParsedAssertion parsed = ReadAndValidate(document->RootElement(), resolver, clockToleranceSec);
   return MakeToken(std::move(parsed), xml, clockToleranceSec);
 }
 
@@ -104,8 +83,8 @@ Token CreateSamlTokenFromDom(ElementNode* assertion, const KeyInfoResolver* reso
 
 Token CreateSamlTokenFromDom(ElementNode* assertion, const KeyInfoResolver* resolver,
                              long clockToleranceSec) {
-  ParsedAssertion parsed = ReadAndJudge(assertion, resolver, clockToleranceSec);
-  return MakeToken(std::move(parsed), CanonicalText(assertion), clockToleranceSec);
+  ParsedAssertion parsed = ReadAndValidate(assertion, resolver, clockToleranceSec);
+  return MakeToken(std::move(parsed), CanonicalizeElement(assertion), clockToleranceSec);
 }
 
 }  // namespace SsoClient

@@ -42,12 +42,10 @@ PrincipalId PrincipalFromGroupIdentity(std::string_view value) {
 }
 
 NameId ReadNameId(ChildCursor& cursor, std::string_view localName) {
-  const Tarnik::Xml::ElementNode& element =
-      ExpectElement(cursor.Current(), localName, kSamlNamespace);
+  const Tarnik::Xml::ElementNode& element = cursor.TakeElement(localName, kSamlNamespace);
   CheckAttributes(element, {}, {"Format"});
   NameId nameId{std::string(element.FindAttribute("Format").value_or("")),
                 std::string(ReadTextContent(element))};
-  cursor.Advance();
   return nameId;
 }
 

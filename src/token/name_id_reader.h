@@ -10,19 +10,19 @@
 
 namespace SsoClient {
 
-/// The principal of a name id of the user-principal-name format, "name@domain"; the last at sign
-/// separates. Throws `ParseException` for another format or an empty or missing part.
+/// The principal of a name id in the user-principal-name format, "name@domain", which is split at
+/// the last at sign. Throws `ParseException` for another format or an empty or missing part.
 PrincipalId PrincipalFromNameId(std::string_view format, std::string_view value);
 
-/// The group that "domain\group" names; the first backslash separates. Throws `ParseException` for
-/// an empty or missing part.
+/// The group of a text "domain\group", which is split at the first backslash. Throws
+/// `ParseException` for an empty or missing part.
 PrincipalId PrincipalFromGroupIdentity(std::string_view value);
 
 /// Reads an element of the NameIDType (SAML 2.0 core, section 2.2.2): Issuer or NameID. Throws
 /// `ParseException`.
 NameId ReadNameId(ChildCursor& cursor, std::string_view localName);
 
-/// Reads a NameID that holds a user principal name.
+/// Reads a NameID that is a user principal name. Throws `ParseException`.
 PrincipalId ReadPrincipal(ChildCursor& cursor);
 
 }  // namespace SsoClient

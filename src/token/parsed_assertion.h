@@ -18,7 +18,7 @@
 
 namespace SsoClient {
 
-/// What an Issuer or NameID element says.
+/// The content of an Issuer or NameID element.
 struct NameId {
   std::string format;  ///< empty when the attribute is absent
   std::string value;
@@ -54,14 +54,14 @@ struct AuthnStatement {
   std::string contextClass;
 };
 
-/// The values that the attribute statement gives.
+/// The values of the attribute statement.
 struct SubjectAttributes {
   std::vector<PrincipalId> groups;
   bool isSolution = false;
   SubjectNames names;
 };
 
-/// Everything that was read from one assertion, not yet judged.
+/// The content of one assertion, before its validity is checked.
 struct ParsedAssertion {
   std::string version;
   std::string id;

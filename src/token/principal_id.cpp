@@ -7,7 +7,7 @@ char ToLowerAscii(char c) {
   return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
 }
 
-// strcasecmp would follow the letter case of the process's locale.
+// strcasecmp would use the letter case rules of the process's locale.
 bool EqualIgnoringCase(const char* a, const char* b) {
   while (*a != '\0' && ToLowerAscii(*a) == ToLowerAscii(*b)) {
     ++a;

@@ -9,7 +9,7 @@
 
 namespace SsoClient {
 
-/// Creates tokens whose signature verifies with one resolver, which it keeps alive.
+/// Creates tokens and verifies their signatures with one resolver, which it keeps alive.
 class SamlTokenFactoryDefault : public SamlTokenFactory {
  public:
   explicit SamlTokenFactoryDefault(const Tarnik::Xml::Security::KeyInfoResolver* resolver)

@@ -5,7 +5,7 @@
 
 #include <tarnik/text/string_util.h>
 
-#include "token/validity_rules.h"
+#include "support/clock_tolerance.h"
 
 namespace SsoClient {
 namespace {
@@ -46,9 +46,7 @@ SamlTokenImpl::~SamlTokenImpl() {
 }
 
 Tarnik::System::DateTime SamlTokenImpl::ExpirationTimeWithTolerance() const {
-  const long end = Tarnik::System::SaturatingAdd(expirationTime_.GetUtcTime(),
-                                                 ToleranceMicroseconds(clockToleranceSec_));
-  return Tarnik::System::DateTimeFromUtc(end, false);
+  return AddSeconds(expirationTime_, clockToleranceSec_);
 }
 
 }  // namespace SsoClient

@@ -16,7 +16,7 @@ namespace SsoClient {
 class SamlTokenImpl final : public SamlToken {
  public:
   SamlTokenImpl(ParsedAssertion&& assertion, std::string xml, long clockToleranceSec);
-  /// Cleanses the text from memory: who has that of a bearer token is its bearer.
+  /// Cleanses the text from memory: whoever holds the text of a bearer token can use the token.
   ~SamlTokenImpl();
 
   const std::string& Id() const override { return id_; }

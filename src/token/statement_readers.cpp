@@ -15,6 +15,27 @@ namespace SsoClient {
 namespace {
 
 using Tarnik::Xml::ElementNode;
+using Values = std::vector<std::string_view>;
+
+constexpr std::string_view kGivenNameAttribute =
+    "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/givenname";
+constexpr std::string_view kSurnameAttribute =
+    "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/surname";
+
+std::string_view ReadContextClass(ChildCursor& cursor) {
+  const ElementNode& element = cursor.TakeElement("AuthnContextClassRef", kSamlNamespace);
+  CheckAttributes(element, {});
+  return ReadTextContent(element);
+}
+
+std::string_view ReadContext(ChildCursor& cursor) {
+  const ElementNode& element = cursor.TakeElement("AuthnContext", kSamlNamespace);
+  CheckAttributes(element, {});
+  ChildCursor children = cursor.Into(element);
+  const std::string_view contextClass = ReadContextClass(children);
+  children.ExpectEnd("Unexpected elements after AuthnContextClassRef");
+  return contextClass;
+}
 
 std::string_view ReadValueText(const ElementNode& element, EmptyValues emptyValues) {
   if (emptyValues == EmptyValues::kRead && element.FirstChild() == nullptr) {
@@ -24,80 +45,11 @@ std::string_view ReadValueText(const ElementNode& element, EmptyValues emptyValu
 }
 
 std::string_view ReadValue(ChildCursor& cursor, EmptyValues emptyValues) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "AttributeValue", kSamlNamespace);
+  const ElementNode& element = cursor.TakeElement("AttributeValue", kSamlNamespace);
   CheckEachAttribute(element, {}, {kTypeAttribute});
   CheckTypeIsNameable(element);
-  const std::string_view value = ReadValueText(element, emptyValues);
-  cursor.Advance();
-  return value;
+  return ReadValueText(element, emptyValues);
 }
-
-}  // namespace
-
-AttributeView ReadSamlAttribute(ChildCursor& cursor, EmptyValues emptyValues) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "Attribute", kSamlNamespace);
-  CheckAttributes(element, {"Name"}, {"NameFormat", "FriendlyName"});
-  AttributeView attribute;
-  attribute.name = ReadAttribute(element, "Name");
-  attribute.nameFormat = element.FindAttribute("NameFormat").value_or("");
-  attribute.friendlyName = element.FindAttribute("FriendlyName").value_or("");
-  ChildCursor children = cursor.Into(element);
-  while (!children.IsAtEnd()) {
-    attribute.values.push_back(ReadValue(children, emptyValues));
-  }
-  cursor.Advance();
-  return attribute;
-}
-
-namespace {
-
-using Tarnik::Xml::ElementNode;
-
-std::string_view ReadContextClass(ChildCursor& cursor) {
-  const ElementNode& element =
-      ExpectElement(cursor.Current(), "AuthnContextClassRef", kSamlNamespace);
-  CheckAttributes(element, {});
-  const std::string_view contextClass = ReadTextContent(element);
-  cursor.Advance();
-  return contextClass;
-}
-
-std::string_view ReadContext(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "AuthnContext", kSamlNamespace);
-  CheckAttributes(element, {});
-  ChildCursor children = cursor.Into(element);
-  const std::string_view contextClass = ReadContextClass(children);
-  if (!children.IsAtEnd()) {
-    throw ParseException("Unexpected elements after AuthnContextClassRef");
-  }
-  cursor.Advance();
-  return contextClass;
-}
-
-}  // namespace
-
-AuthnStatement ReadAuthnStatement(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "AuthnStatement", kSamlNamespace);
-  CheckAttributes(element, {"AuthnInstant"});
-  AuthnStatement statement;
-  statement.instant = ReadDateAttribute(element, "AuthnInstant");
-  ChildCursor children = cursor.Into(element);
-  statement.contextClass = ReadContext(children);
-  if (!children.IsAtEnd()) {
-    throw ParseException("Unexpected elements after AuthnContext");
-  }
-  cursor.Advance();
-  return statement;
-}
-
-namespace {
-
-constexpr std::string_view kGivenNameAttribute =
-    "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/givenname";
-constexpr std::string_view kSurnameAttribute =
-    "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/surname";
-
-using Values = std::vector<std::string_view>;
 
 void AppendGroups(const Values& values, std::vector<PrincipalId>& groups) {
   groups.reserve(groups.size() + values.size());
@@ -134,17 +86,40 @@ void ApplyAttribute(const AttributeView& attribute, SubjectAttributes& result) {
 
 }  // namespace
 
+AuthnStatement ReadAuthnStatement(ChildCursor& cursor) {
+  const ElementNode& element = cursor.TakeElement("AuthnStatement", kSamlNamespace);
+  CheckAttributes(element, {"AuthnInstant"});
+  AuthnStatement statement;
+  statement.instant = ReadDateAttribute(element, "AuthnInstant");
+  ChildCursor children = cursor.Into(element);
+  statement.contextClass = ReadContext(children);
+  children.ExpectEnd("Unexpected elements after AuthnContext");
+  return statement;
+}
+
 SubjectAttributes ReadAttributeStatement(ChildCursor& cursor) {
-  const Tarnik::Xml::ElementNode& element =
-      ExpectElement(cursor.Current(), "AttributeStatement", kSamlNamespace);
+  const ElementNode& element = cursor.TakeElement("AttributeStatement", kSamlNamespace);
   CheckAttributes(element, {});
   SubjectAttributes result;
   ChildCursor children = cursor.Into(element);
   while (!children.IsAtEnd()) {
     ApplyAttribute(ReadSamlAttribute(children), result);
   }
-  cursor.Advance();
   return result;
+}
+
+AttributeView ReadSamlAttribute(ChildCursor& cursor, EmptyValues emptyValues) {
+  const ElementNode& element = cursor.TakeElement("Attribute", kSamlNamespace);
+  CheckAttributes(element, {"Name"}, {"NameFormat", "FriendlyName"});
+  AttributeView attribute;
+  attribute.name = ReadAttribute(element, "Name");
+  attribute.nameFormat = element.FindAttribute("NameFormat").value_or("");
+  attribute.friendlyName = element.FindAttribute("FriendlyName").value_or("");
+  ChildCursor children = cursor.Into(element);
+  while (!children.IsAtEnd()) {
+    attribute.values.push_back(ReadValue(children, emptyValues));
+  }
+  return attribute;
 }
 
 }  // namespace SsoClient

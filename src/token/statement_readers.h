@@ -7,9 +7,17 @@
 #include "token/child_cursor.h"
 #include "token/parsed_assertion.h"
 
+// The statements of an assertion, and the SAML attributes that statements and advice consist of.
 namespace SsoClient {
 
-/// One SAML Attribute (SAML 2.0 core, section 2.7.3.1). The texts live in the tree.
+/// Reads an AuthnStatement (SAML 2.0 core, section 2.7.2). Throws `ParseException`.
+AuthnStatement ReadAuthnStatement(ChildCursor& cursor);
+
+/// Reads an AttributeStatement (SAML 2.0 core, section 2.7.3). Attributes of unknown names are only
+/// checked for their form. Throws `ParseException`.
+SubjectAttributes ReadAttributeStatement(ChildCursor& cursor);
+
+/// One SAML Attribute (SAML 2.0 core, section 2.7.3.1). The texts are in the tree.
 struct AttributeView {
   std::string_view name;
   std::string_view nameFormat;    ///< empty when absent
@@ -17,23 +25,16 @@ struct AttributeView {
   std::vector<std::string_view> values;
 };
 
-/// What becomes of an AttributeValue without any content.
+/// How an AttributeValue without content is handled.
 enum class EmptyValues {
   kRefused,
-  kRead,  ///< as the empty text
+  kRead,  ///< as an empty text
 };
 
-/// Reads an Attribute and its AttributeValue children, each of which holds text alone. Throws
+/// Reads an Attribute and its AttributeValue children, each of which has only text. Throws
 /// `ParseException`.
 AttributeView ReadSamlAttribute(ChildCursor& cursor,
                                 EmptyValues emptyValues = EmptyValues::kRefused);
-
-/// Reads an AuthnStatement (SAML 2.0 core, section 2.7.2). Throws `ParseException`.
-AuthnStatement ReadAuthnStatement(ChildCursor& cursor);
-
-/// Reads an AttributeStatement (SAML 2.0 core, section 2.7.3). Attributes of names that mean
-/// nothing here are checked for their form and left. Throws `ParseException`.
-SubjectAttributes ReadAttributeStatement(ChildCursor& cursor);
 
 }  // namespace SsoClient
 

@@ -13,44 +13,6 @@
 
 namespace SsoClient {
 
-Tarnik::Xml::ElementNode* AsElement(Tarnik::Xml::Node* node) noexcept {
-  if (node == nullptr || node->Kind() != Tarnik::Xml::NodeKind::kElement) {
-    return nullptr;
-  }
-  return static_cast<Tarnik::Xml::ElementNode*>(node);
-}
-
-Tarnik::Xml::ElementNode& ExpectElement(Tarnik::Xml::Node* node, std::string_view localName,
-                                        std::string_view namespaceUri) {
-  Tarnik::Xml::ElementNode* element = AsElement(node);
-  if (element == nullptr || element->LocalName() != localName) {
-    throw ParseException(Concat({"Expected element '", localName, "' not found."}));
-  }
-  if (element->NamespaceUri() != namespaceUri) {
-    throw ParseException(
-        Concat({"Element '", element->QualifiedNameText(), "' has unexpected namespace"}));
-  }
-  return *element;
-}
-
-void ExpectEmpty(const ChildCursor& cursor) {
-  if (!cursor.IsAtEnd()) {
-    throw ParseException(
-        Concat({"Element '", cursor.Parent().QualifiedNameText(), "' must be empty"}));
-  }
-}
-
-std::string_view ReadTextContent(const Tarnik::Xml::ElementNode& element) {
-  const Tarnik::Xml::Node* child = element.FirstChild();
-  if (child == nullptr || child->Kind() != Tarnik::Xml::NodeKind::kText ||
-      child->NextSibling() != nullptr) {
-    throw ParseException(
-        Concat({"Element '", element.QualifiedNameText(),
-                "' must only have textual content (but has extra children or is empty)."}));
-  }
-  return static_cast<const Tarnik::Xml::TextNode*>(child)->Text();
-}
-
 namespace {
 
 using Tarnik::Xml::Attribute;
@@ -70,7 +32,7 @@ std::string_view DisplayName(const QNameView& name) {
   return name == kTypeAttribute ? std::string_view("xsi:type") : name.localName;
 }
 
-// Under a locale with digit grouping, lexical_cast would take "1,000" as well.
+// In a locale with digit grouping, lexical_cast would also accept "1,000".
 bool IsPlainInteger(std::string_view text) {
   if (!text.empty() && (text.front() == '+' || text.front() == '-')) {
     text.remove_prefix(1);
@@ -153,7 +115,7 @@ std::uint32_t ReadCountAttribute(const ElementNode& element, std::string_view na
           boost::lexical_cast<long>(text.data(), text.size()));
     }
   } catch (const boost::bad_lexical_cast&) {
-    // Digits alone can still be too many for 64 bits.
+    // Too many digits for 64 bits.
   } catch (const boost::numeric::bad_numeric_cast&) {
     // Negative, or too large for a count.
   }
@@ -170,6 +132,24 @@ bool ReadBooleanAttribute(const ElementNode& element, std::string_view name) {
     return false;
   }
   throw ParseException(Concat({element.QualifiedNameText(), "/@", name, " is not a Boolean"}));
+}
+
+std::string_view ReadTextContent(const ElementNode& element) {
+  const Tarnik::Xml::Node* child = element.FirstChild();
+  if (child == nullptr || child->Kind() != Tarnik::Xml::NodeKind::kText ||
+      child->NextSibling() != nullptr) {
+    throw ParseException(
+        Concat({"Element '", element.QualifiedNameText(),
+                "' must only have textual content (but has extra children or is empty)."}));
+  }
+  return static_cast<const Tarnik::Xml::TextNode*>(child)->Text();
+}
+
+void ExpectEmpty(const ChildCursor& cursor) {
+  if (!cursor.IsAtEnd()) {
+    throw ParseException(
+        Concat({"Element '", cursor.Parent().QualifiedNameText(), "' must be empty"}));
+  }
 }
 
 }  // namespace SsoClient

@@ -13,55 +13,50 @@
 #include "support/qname.h"
 #include "token/child_cursor.h"
 
+// The rules for the attributes and the text of an element. Whatever a rule does not allow is a
+// `ParseException`.
 namespace SsoClient {
-
-/// `node` as an element; null when it is null or of another kind.
-Tarnik::Xml::ElementNode* AsElement(Tarnik::Xml::Node* node) noexcept;
-
-/// `node` as the element of this name and namespace. Throws `ParseException` when it is anything
-/// else or null.
-Tarnik::Xml::ElementNode& ExpectElement(Tarnik::Xml::Node* node, std::string_view localName,
-                                        std::string_view namespaceUri);
-
-/// Throws `ParseException` unless the cursor's element has nothing more to read.
-void ExpectEmpty(const ChildCursor& cursor);
-
-/// The text of an element whose only child is text; as long-lived as the tree. Throws
-/// `ParseException` for any other content: a comment that splits a value would otherwise let two
-/// readers of one signed text see two values.
-std::string_view ReadTextContent(const Tarnik::Xml::ElementNode& element);
 
 /// The expanded name of xsi:type; elements may bind its namespace to any prefix.
 inline constexpr QNameView kTypeAttribute = {kXsiNamespace, "type"};
 
-/// Throws `ParseException` unless `element` has all `required` attributes and, namespace
-/// declarations aside, none but these and `optional` ones. Names are qualified names.
+/// Throws `ParseException` unless `element` has all `required` attributes and, apart from namespace
+/// declarations, no others except `optional` ones. Names are qualified names.
 void CheckAttributes(const Tarnik::Xml::ElementNode& element,
                      std::initializer_list<std::string_view> required,
                      std::initializer_list<std::string_view> optional = {});
 
-/// The same rule by expanded names, for elements that may carry xsi:type; names the attribute that
-/// is one too many.
+/// The same rule by expanded names, for elements that may have xsi:type. The message names the
+/// unexpected attribute.
 void CheckEachAttribute(const Tarnik::Xml::ElementNode& element,
                         std::initializer_list<QNameView> required,
                         std::initializer_list<QNameView> optional = {});
 
-/// The value of xsi:type, or none.
+/// The value of xsi:type, if the element has it.
 std::optional<std::string_view> FindTypeAttribute(const Tarnik::Xml::ElementNode& element);
 
-/// For elements that are read the same way whatever type they name: throws `ParseException` when
-/// xsi:type is there with a prefix that nothing binds, since a type that cannot be named is none.
+/// For elements that are read the same way whatever their type: throws `ParseException` when
+/// xsi:type is present with an undeclared prefix, because such a value names no type.
 void CheckTypeIsNameable(const Tarnik::Xml::ElementNode& element);
 
-/// The readers below take the attribute of this qualified name and throw `ParseException` when it
-/// is missing or its value is not of the kind that they read.
+// The readers below return the attribute of this qualified name. They throw `ParseException` when
+// it is missing or its value is not of the kind that they read.
+
 std::string_view ReadAttribute(const Tarnik::Xml::ElementNode& element, std::string_view name);
 Tarnik::System::DateTime ReadDateAttribute(const Tarnik::Xml::ElementNode& element,
                                            std::string_view name);
-/// Decimal digits behind an optional sign, at most 2^32 - 1.
+/// Decimal digits after an optional sign, at most 2^32 - 1.
 std::uint32_t ReadCountAttribute(const Tarnik::Xml::ElementNode& element, std::string_view name);
 /// "true", "false", "1" or "0", in any letter case.
 bool ReadBooleanAttribute(const Tarnik::Xml::ElementNode& element, std::string_view name);
+
+/// Returns the text of an element whose only child is text; valid as long as the tree. Throws
+/// `ParseException` for any other content: if a comment could split a value, two readers of one
+/// signed text might see two values.
+std::string_view ReadTextContent(const Tarnik::Xml::ElementNode& element);
+
+/// Throws `ParseException` unless everything in the cursor's element has been read.
+void ExpectEmpty(const ChildCursor& cursor);
 
 }  // namespace SsoClient
 

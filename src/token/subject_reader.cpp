@@ -25,42 +25,33 @@ TokenConfirmationType ParseMethod(std::string_view method) {
   throw ParseException(Concat({"Unknown subject confirmation method: '", method, "'"}));
 }
 
-void ExpectEnd(const ChildCursor& cursor, const char* message) {
-  if (!cursor.IsAtEnd()) {
-    throw ParseException(message);
-  }
-}
-
 Tarnik::Ref<const Tarnik::Crypto::Certificate> ReadCertificate(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "X509Certificate", kDsigNamespace);
+  const ElementNode& element = cursor.TakeElement("X509Certificate", kDsigNamespace);
   CheckAttributes(element, {});
   std::vector<unsigned char> der;
   Tarnik::StringUtil::Base64Decode(ReadTextContent(element), der);
-  cursor.Advance();
   return Tarnik::Crypto::CreateCertificateFromDer(der.data(), der.size());
 }
 
 Tarnik::Ref<const Tarnik::Crypto::Certificate> ReadX509Data(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "X509Data", kDsigNamespace);
+  const ElementNode& element = cursor.TakeElement("X509Data", kDsigNamespace);
   CheckAttributes(element, {});
   ChildCursor children = cursor.Into(element);
   auto certificate = ReadCertificate(children);
-  ExpectEnd(children, "Unexpected elements after X509Certificate");
-  cursor.Advance();
+  children.ExpectEnd("Unexpected elements after X509Certificate");
   return certificate;
 }
 
 Tarnik::Ref<const Tarnik::Crypto::Certificate> ReadKeyInfo(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "KeyInfo", kDsigNamespace);
+  const ElementNode& element = cursor.TakeElement("KeyInfo", kDsigNamespace);
   CheckAttributes(element, {});
   ChildCursor children = cursor.Into(element);
   auto certificate = ReadX509Data(children);
-  ExpectEnd(children, "Unexpected elements after X509Data");
-  cursor.Advance();
+  children.ExpectEnd("Unexpected elements after X509Data");
   return certificate;
 }
 
-// SAML 2.0 core, section 2.4.1.3: the type of data that names the holder's key.
+// SAML 2.0 core, section 2.4.1.3: the type of data that contains the holder's key.
 void CheckKeyInfoType(const ElementNode& data) {
   const std::string_view type = FindTypeAttribute(data).value_or("");
   if (ResolveQNameValue(data, type) != QNameView{kSamlNamespace, "KeyInfoConfirmationDataType"}) {
@@ -73,7 +64,7 @@ void ReadHolderOfKeyData(const ElementNode& data, ChildCursor& children, ParsedS
   CheckKeyInfoType(data);
   subject.notOnOrAfter = ReadDateAttribute(data, "NotOnOrAfter");
   subject.holderOfKeyCertificate = ReadKeyInfo(children);
-  ExpectEnd(children, "Unexpected elements after SubjectConfirmationData/KeyInfo");
+  children.ExpectEnd("Unexpected elements after SubjectConfirmationData/KeyInfo");
 }
 
 void ReadBearerData(const ElementNode& data, const ChildCursor& children, ParsedSubject& subject) {
@@ -84,20 +75,17 @@ void ReadBearerData(const ElementNode& data, const ChildCursor& children, Parsed
 }
 
 void ReadConfirmationData(ChildCursor& cursor, ParsedSubject& subject) {
-  const ElementNode& data =
-      ExpectElement(cursor.Current(), "SubjectConfirmationData", kSamlNamespace);
+  const ElementNode& data = cursor.TakeElement("SubjectConfirmationData", kSamlNamespace);
   ChildCursor children = cursor.Into(data);
   if (subject.confirmationMethod == HOLDER_OF_KEY) {
     ReadHolderOfKeyData(data, children, subject);
   } else {
     ReadBearerData(data, children, subject);
   }
-  cursor.Advance();
 }
 
 void ReadConfirmation(ChildCursor& cursor, ParsedSubject& subject) {
-  const ElementNode& element =
-      ExpectElement(cursor.Current(), "SubjectConfirmation", kSamlNamespace);
+  const ElementNode& element = cursor.TakeElement("SubjectConfirmation", kSamlNamespace);
   CheckAttributes(element, {"Method"});
   subject.confirmationMethod = ParseMethod(ReadAttribute(element, "Method"));
   ChildCursor children = cursor.Into(element);
@@ -105,21 +93,19 @@ void ReadConfirmation(ChildCursor& cursor, ParsedSubject& subject) {
     subject.delegateId = ReadPrincipal(children);
   }
   ReadConfirmationData(children, subject);
-  ExpectEnd(children, "Unexpected elements after SubjectConfirmationData");
-  cursor.Advance();
+  children.ExpectEnd("Unexpected elements after SubjectConfirmationData");
 }
 
 }  // namespace
 
 ParsedSubject ReadSubject(ChildCursor& cursor) {
-  const ElementNode& element = ExpectElement(cursor.Current(), "Subject", kSamlNamespace);
+  const ElementNode& element = cursor.TakeElement("Subject", kSamlNamespace);
   CheckAttributes(element, {});
   ParsedSubject subject;
   ChildCursor children = cursor.Into(element);
   subject.principal = ReadPrincipal(children);
   ReadConfirmation(children, subject);
-  ExpectEnd(children, "Unexpected elements after SubjectConfirmation");
-  cursor.Advance();
+  children.ExpectEnd("Unexpected elements after SubjectConfirmation");
   return subject;
 }
 

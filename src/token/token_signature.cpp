@@ -26,15 +26,15 @@ Ref<Signature> ParseSignature(ElementNode* element) {
   }
 }
 
-// XML-Signature, section 4.3.3.3: the empty URI is the document that holds the signature, "#id" the
-// element of this id.
+// XML Signature 1.1, section 4.4.3.3: an empty URI refers to the document that contains the
+// signature, "#id" to the element with this id.
 bool Covers(std::string_view uri, std::string_view assertionId) {
   return uri.empty() || (uri.front() == '#' && uri.substr(1) == assertionId);
 }
 
-// What KeyInfo holds is not signed, and the token's text is handed on with it: there an assertion
-// would wait for a reader that looks for one anywhere.
-bool HoldsSamlElement(const ElementNode* keyInfo) {
+// The content of KeyInfo is not signed, but it is part of the text that callers pass on. A reader
+// that takes an assertion from anywhere in that text would find one there.
+bool ContainsSamlElement(const ElementNode* keyInfo) {
   const ElementNode* element = keyInfo;
   while (element != nullptr && element->NamespaceUri() != kSamlNamespace) {
     element = element->NextElement(keyInfo);
@@ -57,7 +57,7 @@ Ref<Signature> ReadSignature(ChildCursor& cursor, std::string_view assertionId) 
   if (!covered) {
     throw ParseException("Token's signature must cover the entire token");
   }
-  if (HoldsSamlElement(signature->KeyInfo().element.get())) {
+  if (ContainsSamlElement(signature->KeyInfo().element.get())) {
     throw ParseException("Token's signature must not hold SAML elements");
   }
   cursor.Advance();

@@ -11,14 +11,14 @@
 
 namespace SsoClient {
 
-/// Reads the signature at the cursor and checks its form and that one of its references names the
-/// assertion with this ID or the whole document, and that its KeyInfo, which is not signed, holds
-/// no SAML element. Verifies nothing. Throws `ParseException`.
+/// Reads the signature at the cursor. Checks its form, that one of its references is to the
+/// assertion with this ID or to the whole document, and that its KeyInfo, which is not signed,
+/// contains no SAML element. Does not verify the signature. Throws `ParseException`.
 Tarnik::Ref<Tarnik::Xml::Security::Signature> ReadSignature(ChildCursor& cursor,
                                                             std::string_view assertionId);
 
-/// Throws `InvalidSignatureException` unless `signature`, all its references included, verifies
-/// with the key that `resolver` gives.
+/// Throws `InvalidSignatureException` unless `signature` and all its references verify with the key
+/// that `resolver` returns.
 void VerifySignature(const Tarnik::Xml::Security::Signature& signature,
                      const Tarnik::Xml::Security::KeyInfoResolver* resolver);
 

@@ -2,6 +2,7 @@
 
 #include <ssoclient/exceptions.h>
 
+#include "support/clock_tolerance.h"
 #include "support/concat.h"
 
 namespace SsoClient {
@@ -10,8 +11,6 @@ namespace {
 using Tarnik::System::DateTime;
 using Tarnik::System::SaturatingAdd;
 using Tarnik::System::SaturatingMultiply;
-
-constexpr long kMicrosecondsPerSecond = 1'000'000;
 
 void CheckIdentity(const ParsedAssertion& assertion) {
   if (assertion.version != "2.0") {
@@ -27,7 +26,7 @@ void CheckPeriod(const ParsedConditions& conditions, long clockToleranceSec, con
     throw ParseException(
         "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");
   }
-  // Multiplied by a negative factor: the smallest tolerance has no opposite to multiply.
+  // Multiplied by a negative factor, because the smallest `long` cannot be negated.
   const long backwards = SaturatingMultiply(clockToleranceSec, -kMicrosecondsPerSecond);
   if (SaturatingAdd(conditions.notBefore.GetUtcTime(), backwards) > now.GetUtcTime()) {
     throw ParseException(
@@ -72,10 +71,6 @@ void CheckDelegation(const std::optional<PrincipalId>& delegateId,
 }
 
 }  // namespace
-
-long ToleranceMicroseconds(long clockToleranceSec) noexcept {
-  return SaturatingMultiply(clockToleranceSec, kMicrosecondsPerSecond);
-}
 
 void CheckValidity(const ParsedAssertion& assertion, long clockToleranceSec, const DateTime& now) {
   CheckIdentity(assertion);

@@ -10,7 +10,7 @@
 
 namespace SsoClient {
 
-/// What an exchange came to: a reader over the answer's body, or the failure.
+/// The result of an exchange: a reader over the answer's body, or the failure.
 struct ExchangeOutcome {
   Tarnik::Ref<Tarnik::Reader> body;
   std::optional<CommunicationException> failure;
@@ -19,8 +19,8 @@ struct ExchangeOutcome {
 /// The outcome of an exchange that failed below HTTP.
 ExchangeOutcome InterpretFailure(const Tarnik::Exception& error);
 
-/// The outcome of an exchange that was answered. Status 500 is as good as 2xx, since SOAP faults
-/// travel with it (SOAP 1.1, section 6.2).
+/// The outcome of an exchange that was answered. Status 500 counts as success like 2xx, since SOAP
+/// faults are sent with it (SOAP 1.1, section 6.2).
 ExchangeOutcome InterpretResponse(const Tarnik::Http::ClientResponse& response);
 
 }  // namespace SsoClient

@@ -16,8 +16,8 @@ namespace SsoClient {
 /// Posts SOAP requests over HTTP or HTTPS. Immutable.
 class HttpsClient final : public Transport {
  public:
-  /// Connects to the host of `url`; each session has a user agent and cookies of its own.
-  /// `sslPeerName` and `flag` go to the connection spec. `timeout`, in microseconds, limits each
+  /// Connects to the host of `url`; each session has its own user agent and cookies. `sslPeerName`
+  /// and `flag` are passed to the connection spec. `timeout`, in microseconds, limits each
   /// exchange.
   ///
   /// Throws `Tarnik::InvalidArgumentException` for a malformed URL, and for an https URL when
@@ -26,7 +26,7 @@ class HttpsClient final : public Transport {
               const std::string& sslPeerName, unsigned long timeout, bool flag);
 
   /// Sends through the caller's `userAgent`, which all sessions share. `path` is the request
-  /// target, used as it stands. Throws `Tarnik::InvalidArgumentException` when `userAgent` is null.
+  /// target, used unchanged. Throws `Tarnik::InvalidArgumentException` when `userAgent` is null.
   HttpsClient(Tarnik::Http::UserAgent* userAgent, std::string path, unsigned long timeout);
 
   std::shared_ptr<TransportSession> CreateSession() const override;

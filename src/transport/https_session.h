@@ -10,7 +10,7 @@
 
 namespace SsoClient {
 
-/// Posts to `path` through `userAgent`, at most `timeout` microseconds an exchange.
+/// Posts to `path` through `userAgent`, at most `timeout` microseconds for each exchange.
 class HttpsSession final : public TransportSession {
  public:
   HttpsSession(Tarnik::Ref<Tarnik::Http::UserAgent> userAgent, std::string path,

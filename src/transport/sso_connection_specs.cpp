@@ -10,21 +10,42 @@ namespace SsoClient {
 
 namespace {
 
+using ConnectCompletion = Tarnik::Http::CustomConnectionSpec::ConnectCompletion;
 using Tarnik::System::TCPClientSocket;
 
-// The place where a source of replacement hosts plugs in; none is built in.
+// Where a source of replacement hosts plugs in. There is none yet.
 std::string FindReplacementHost() {
   return {};
 }
 
-TCPClientSocket::ConnectCompletion AsSocketCompletion(
-    Tarnik::Http::CustomConnectionSpec::ConnectCompletion completion) {
+TCPClientSocket::ConnectCompletion AsSocketCompletion(ConnectCompletion completion) {
   if (!completion) {
     return nullptr;
   }
   return [completion = std::move(completion)](TCPClientSocket* socket, Tarnik::Exception* error) {
     completion(socket, error);
   };
+}
+
+void StartSslHandshake(const std::string& host, Tarnik::Ssl::SSLContext* sslContext,
+                       const std::string& serverName, const ConnectCompletion& completion,
+                       Tarnik::System::Stream* stream, Tarnik::Exception* error) {
+  if (error != nullptr) {
+    completion(stream, error);
+    return;
+  }
+  Tarnik::Ref<Tarnik::Ssl::SSLStream> sslStream;
+  try {
+    sslStream = sslContext->WrapStream(stream, "");
+    sslStream->HandshakeClientAsync(host, serverName,
+                                    [completion, sslStream](Tarnik::Exception* handshakeError) {
+                                      completion(sslStream.get(), handshakeError);
+                                    });
+  } catch (Tarnik::Exception& refusal) {
+    // For instance an invalid server name. If the exception propagated, it would end the I/O
+    // thread.
+    completion(sslStream != nullptr ? sslStream.get() : stream, &refusal);
+  }
 }
 
 }  // namespace
@@ -76,32 +97,6 @@ Tarnik::Ref<Tarnik::System::CancellableItem> SsoCustomConnectionSpecImpl::StartC
     return true;
   });
 }
-
-namespace {
-
-using ConnectCompletion = Tarnik::Http::CustomConnectionSpec::ConnectCompletion;
-
-void StartSslHandshake(const std::string& host, Tarnik::Ssl::SSLContext* sslContext,
-                       const std::string& serverName, const ConnectCompletion& completion,
-                       Tarnik::System::Stream* stream, Tarnik::Exception* error) {
-  if (error != nullptr) {
-    completion(stream, error);
-    return;
-  }
-  Tarnik::Ref<Tarnik::Ssl::SSLStream> sslStream;
-  try {
-    sslStream = sslContext->WrapStream(stream, "");
-    sslStream->HandshakeClientAsync(host, serverName,
-                                    [completion, sslStream](Tarnik::Exception* handshakeError) {
-                                      completion(sslStream.get(), handshakeError);
-                                    });
-  } catch (Tarnik::Exception& refusal) {
-    // A server name that is none, for instance. Left to go on, it would end the I/O thread.
-    completion(sslStream != nullptr ? sslStream.get() : stream, &refusal);
-  }
-}
-
-}  // namespace
 
 SsoCustomSslConnectionSpecImpl::SsoCustomSslConnectionSpecImpl(
     Tarnik::Ssl::SSLContext* sslContext, std::string serverName,

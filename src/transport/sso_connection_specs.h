@@ -12,8 +12,8 @@
 
 namespace SsoClient {
 
-/// Opens plain TCP connections. The overrides below take slots of their own in this class's vtable,
-/// in the order of their declaration, since the interface is a virtual base.
+/// Opens plain TCP connections. The interface is a virtual base, so the overrides below have slots
+/// of their own in this class's vtable, in the order of their declaration.
 class SsoCustomConnectionSpecImpl final : public virtual Tarnik::Http::CustomConnectionSpec,
                                           public Tarnik::WeakLinkableImpl<Tarnik::ObjectImpl> {
  public:
@@ -22,15 +22,15 @@ class SsoCustomConnectionSpecImpl final : public virtual Tarnik::Http::CustomCon
   /// "<cs p:ADDRESS, SsoCustomConnectionSpec:HOST:PORT>".
   std::string ToString() const override;
 
-  /// These three tell the configured host, whatever host is connected to.
+  /// These three return the configured host, whatever host is connected to.
   std::string Host() const override;
   std::string CookieHost() const override;
   std::string EndpointKey() const override;
   bool IsProxy() const override;
   Tarnik::Ref<Tarnik::System::CancellableItem> StartConnect(ConnectCompletion completion) override;
 
-  /// The host to connect to: a replacement if there is one and the flag allows it, else the
-  /// configured host.
+  /// The host to connect to: a replacement host if there is one and the flag allows it, otherwise
+  /// the configured host.
   std::string ChooseHost() const;
 
   /// Connects to `host` at this spec's port.
@@ -43,9 +43,9 @@ class SsoCustomConnectionSpecImpl final : public virtual Tarnik::Http::CustomCon
   bool flag_;
 };
 
-/// Opens the TCP connections of an inner spec and runs a TLS handshake on them. Tells everything
-/// about itself as the inner spec does, so that log lines of both kinds look alike. Slots as in the
-/// inner spec's class.
+/// Opens the TCP connections of an inner spec and runs a TLS handshake on them. Describes itself as
+/// the inner spec does, so that log lines of both kinds look alike. Slots as in the inner spec's
+/// class.
 class SsoCustomSslConnectionSpecImpl final : public virtual Tarnik::Http::CustomConnectionSpec,
                                              public Tarnik::WeakLinkableImpl<Tarnik::ObjectImpl> {
  public:
@@ -58,7 +58,7 @@ class SsoCustomSslConnectionSpecImpl final : public virtual Tarnik::Http::Custom
   std::string CookieHost() const override;
   std::string EndpointKey() const override;
   bool IsProxy() const override;
-  /// The completion gets the TLS stream also with a failed handshake: the exception decides.
+  /// The completion receives the TLS stream even when the handshake failed: check the exception.
   Tarnik::Ref<Tarnik::System::CancellableItem> StartConnect(ConnectCompletion completion) override;
 
  private:
@@ -67,13 +67,13 @@ class SsoCustomSslConnectionSpecImpl final : public virtual Tarnik::Http::Custom
   Tarnik::Ref<SsoCustomConnectionSpecImpl> inner_;
 };
 
-/// Makes a spec of plain TCP connections to `host` and `port`. With `flag` a replacement host is
-/// looked for before each connection.
+/// Creates a spec of plain TCP connections to `host` and `port`. With `flag`, each connection first
+/// looks for a replacement host.
 void CreateSsoConnectionSpec(const std::string& host, int port, bool flag,
                              Tarnik::Ref<Tarnik::Http::ConnectionSpec>& spec);
 
-/// Makes a spec of TLS connections over the same. The peer must be `serverName`, or the host
-/// connected to if that is empty. `sslContext` must not be null; the spec keeps a reference to it.
+/// Creates a spec of TLS connections over the same. The peer must be `serverName` or, if that is
+/// empty, the host connected to. `sslContext` must not be null; the spec keeps a reference to it.
 void CreateSsoSSLConnectionSpec(const std::string& host, int port,
                                 Tarnik::Ssl::SSLContext* sslContext, const std::string& serverName,
                                 bool flag, Tarnik::Ref<Tarnik::Http::ConnectionSpec>& spec);

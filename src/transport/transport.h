@@ -13,8 +13,8 @@
 
 namespace SsoClient {
 
-/// What a session posts. Not copied, and its body is cleansed from memory when it dies, since it
-/// holds passwords and tokens.
+/// What a session posts. Its body contains passwords and tokens, so it cannot be copied and is
+/// cleansed from memory when it is destroyed.
 struct SoapRequest {
   std::string action;  ///< the SOAPAction URI, without quotes
   std::string body;    ///< the whole serialised envelope
@@ -25,21 +25,21 @@ struct SoapRequest {
   ~SoapRequest() { Tarnik::StringUtil::Cleanse(body); }
 };
 
-/// One exchange, or one negotiation of several. Used by one exchange at a time. Owned through a
-/// `std::shared_ptr` to the concrete class.
+/// One exchange, or one negotiation of several exchanges. Used by one exchange at a time. Owned by
+/// a `std::shared_ptr` to the concrete class.
 class TransportSession {
  public:
   /// Receives null and a reader over the answer's body, or the `CommunicationException` and null.
   /// Both are valid only during the call. Called once, on an I/O thread; must not block.
   using Completion = std::function<void(const Tarnik::Exception*, Tarnik::Reader*)>;
 
-  /// Posts `request` and waits for the answer, whose body `reader` then reads. Throws
+  /// Posts `request`, waits for the answer and assigns a reader over its body to `reader`. Throws
   /// `CommunicationException` when the exchange fails or the answer's HTTP status is neither 2xx
-  /// nor 500; what making the request throws passes through.
+  /// nor 500. Exceptions from creating the HTTP request propagate.
   virtual void SendRequest(const SoapRequest& request,
                            Tarnik::Ref<Tarnik::Reader>& reader) const = 0;
 
-  /// Posts `request` and returns at once with a handle that can call the exchange off.
+  /// Posts `request` and returns immediately with a handle that can cancel the exchange.
   virtual void SendRequestAsync(const SoapRequest& request, const Completion& completion,
                                 Tarnik::Ref<Tarnik::Http::PendingRequestItem>& handle) const = 0;
 
@@ -47,7 +47,7 @@ class TransportSession {
   ~TransportSession() = default;
 };
 
-/// Makes sessions; safe from many threads. Owned like a session.
+/// Creates sessions; safe from many threads. Owned like a session.
 class Transport {
  public:
   virtual std::shared_ptr<TransportSession> CreateSession() const = 0;

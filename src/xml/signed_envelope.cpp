@@ -10,58 +10,9 @@
 
 #include "support/namespaces.h"
 #include "xml/security_header.h"
+#include "xml/ws_trust_names.h"
 
 namespace SsoClient {
-
-std::shared_ptr<XMLCompositeBuilder> BuildEnvelope(const std::shared_ptr<XMLBaseBuilder>& header,
-                                                   const std::shared_ptr<XMLBaseBuilder>& body) {
-  auto headerElement = MakeCompositeBuilder("soapenv", "Header");
-  headerElement->Add(header);
-  auto bodyElement = MakeCompositeBuilder("soapenv", "Body", {{"xmlns:wst", kWstNamespace}});
-  bodyElement->Add(body);
-  auto envelope = MakeCompositeBuilder("soapenv", "Envelope", {{"xmlns:soapenv", kSoapNamespace}});
-  envelope->Add(headerElement).Add(bodyElement);
-  return envelope;
-}
-
-namespace {
-
-using Tarnik::Xml::ElementNode;
-
-// Whatever its namespace: services differ in what they take for an id.
-bool MayBeTakenForId(std::string_view localName) {
-  return localName == "Id" || localName == "ID" || localName == "id";
-}
-
-bool Carries(const ElementNode& element, std::string_view id) {
-  for (std::size_t i = 0; i < element.AttributeCount(); ++i) {
-    const auto& attribute = element.AttributeAt(i);
-    if (attribute.Value() == id && MayBeTakenForId(attribute.Qualified().Local())) {
-      return true;
-    }
-  }
-  return false;
-}
-
-[[noreturn]] void Refuse(const char* id) {
-  throw Tarnik::InvalidArgumentException(std::string("A token in the request carries the id '") +
-                                         id + "', which is the request's own");
-}
-
-}  // namespace
-
-void RequireOwnIds(const ElementNode& envelope) {
-  int certificates = 0;
-  for (const ElementNode* element = &envelope; element != nullptr;
-       element = element->NextElement(&envelope)) {
-    if (Carries(*element, kProofSignatureId)) {
-      Refuse(kProofSignatureId);
-    }
-    if (Carries(*element, kCertificateId) && ++certificates > 1) {
-      Refuse(kCertificateId);
-    }
-  }
-}
 
 namespace {
 
@@ -73,8 +24,28 @@ constexpr char kSignatureMethod[] = "http://www.w3.org/2001/04/xmldsig-more#rsa-
 constexpr char kExclusiveC14n[] = "http://www.w3.org/2001/10/xml-exc-c14n#";
 constexpr char kSha256[] = "http://www.w3.org/2001/04/xmlenc#sha256";
 
-// The wsu:Id of an element, which is given one if it has none.
-std::string IdOf(ElementNode& element) {
+// Whatever its namespace: services differ in which attributes they use as ids.
+bool IsSpelledLikeAnId(std::string_view localName) {
+  return localName == "Id" || localName == "ID" || localName == "id";
+}
+
+bool HasId(const ElementNode& element, std::string_view id) {
+  for (std::size_t i = 0; i < element.AttributeCount(); ++i) {
+    const auto& attribute = element.AttributeAt(i);
+    if (attribute.Value() == id && IsSpelledLikeAnId(attribute.Qualified().Local())) {
+      return true;
+    }
+  }
+  return false;
+}
+
+[[noreturn]] void ThrowReservedId(const char* id) {
+  throw Tarnik::InvalidArgumentException(std::string("A token in the request carries the id '") +
+                                         id + "', which is the request's own");
+}
+
+// The wsu:Id of `element`, generated if it has none.
+std::string EnsureId(ElementNode& element) {
   if (const auto id = element.FindAttribute(kWsuNamespace, "Id")) {
     return std::string(*id);
   }
@@ -85,7 +56,7 @@ std::string IdOf(ElementNode& element) {
 }
 
 void AddReference(Signature& signature, ElementNode& element) {
-  signature.AddReference("#" + IdOf(element), kSha256)->AddTransform(kExclusiveC14n);
+  signature.AddReference("#" + EnsureId(element), kSha256)->AddTransform(kExclusiveC14n);
 }
 
 void SetKeyInfo(Signature& signature, const XMLBaseBuilder& keyInfo) {
@@ -95,6 +66,18 @@ void SetKeyInfo(Signature& signature, const XMLBaseBuilder& keyInfo) {
 }
 
 }  // namespace
+
+std::shared_ptr<XMLCompositeBuilder> BuildEnvelope(const std::shared_ptr<XMLBaseBuilder>& header,
+                                                   const std::shared_ptr<XMLBaseBuilder>& body) {
+  auto headerElement = MakeCompositeBuilder("soapenv", "Header");
+  headerElement->Add(header);
+  auto bodyElement =
+      MakeCompositeBuilder("soapenv", "Body", {{"xmlns:wst", kWsTrust13.namespaceUri}});
+  bodyElement->Add(body);
+  auto envelope = MakeCompositeBuilder("soapenv", "Envelope", {{"xmlns:soapenv", kSoapNamespace}});
+  envelope->Add(headerElement).Add(bodyElement);
+  return envelope;
+}
 
 XMLSignedSoapBuilder::XMLSignedSoapBuilder(std::shared_ptr<XMLBaseBuilder> header,
                                            std::shared_ptr<XMLBaseBuilder> body,
@@ -107,7 +90,7 @@ XMLSignedSoapBuilder::XMLSignedSoapBuilder(std::shared_ptr<XMLBaseBuilder> heade
 
 void XMLSignedSoapBuilder::Build(Ref<ElementNode>& out) const {
   BuildEnvelope(header_, body_)->Build(out);
-  RequireOwnIds(*out);
+  RejectReservedIds(*out);
   ElementNode* body = out->FirstChildElement(kSoapNamespace, "Body");
   ElementNode* security = out->FirstChildElement(kSoapNamespace, "Header")
                               ->FirstChildElement(kWsseNamespace, "Security");
@@ -125,34 +108,34 @@ void XMLSignedSoapBuilder::Build(Ref<ElementNode>& out) const {
   security->AppendChild(signature->Element());
 }
 
-namespace {
-
-std::shared_ptr<XMLBaseBuilder> BuildCertificateReference() {
-  auto reference =
-      MakeCompositeBuilder("wsse", "SecurityTokenReference", {{"xmlns:wsse", kWsseNamespace}});
-  reference->Add(MakeElementBuilder(
-      "wsse", "Reference",
-      {{"URI", std::string("#") + kCertificateId}, {"ValueType", kX509TokenType}}));
-  return reference;
-}
-
-}  // namespace
-
 std::shared_ptr<XMLSignedSoapBuilder> MakeSignedSoapBuilderForToken(
     const std::shared_ptr<XMLBaseBuilder>& header, const std::shared_ptr<XMLBaseBuilder>& body,
-    const Tarnik::Ref<const Tarnik::Crypto::PrivateKey>& privateKey, std::string_view assertionId) {
+    const Ref<const Tarnik::Crypto::PrivateKey>& privateKey, std::string_view assertionId) {
   return std::make_shared<XMLSignedSoapBuilder>(header, body, privateKey,
                                                 BuildSamlTokenReference(assertionId));
 }
 
 std::shared_ptr<XMLSignedSoapBuilder> MakeSignedSoapBuilderForCertificate(
     const std::shared_ptr<XMLBaseBuilder>& header, const std::shared_ptr<XMLBaseBuilder>& body,
-    const Tarnik::Ref<const Tarnik::Crypto::PrivateKey>& privateKey,
+    const Ref<const Tarnik::Crypto::PrivateKey>& privateKey,
     const Tarnik::Crypto::Certificate& certificate) {
   auto headerWithCertificate = std::make_shared<XMLCompositeBuilder>(header);
   headerWithCertificate->Add(BuildBinarySecurityToken(kCertificateId, certificate));
   return std::make_shared<XMLSignedSoapBuilder>(headerWithCertificate, body, privateKey,
                                                 BuildCertificateReference());
+}
+
+void RejectReservedIds(const ElementNode& envelope) {
+  int certificates = 0;
+  for (const ElementNode* element = &envelope; element != nullptr;
+       element = element->NextElement(&envelope)) {
+    if (HasId(*element, kProofSignatureId)) {
+      ThrowReservedId(kProofSignatureId);
+    }
+    if (HasId(*element, kCertificateId) && ++certificates > 1) {
+      ThrowReservedId(kCertificateId);
+    }
+  }
 }
 
 }  // namespace SsoClient

@@ -13,30 +13,24 @@
 
 namespace SsoClient {
 
-/// A SOAP 1.1 envelope (SOAP 1.1, section 4). An empty `header` leaves the Header element empty.
-/// "wst" is declared on the Body, for bodies that do not declare it themselves.
+/// A SOAP 1.1 envelope without a signature (SOAP 1.1, section 4). With a null `header`, the Header
+/// element is empty. The Body declares the prefix wst, for bodies that do not.
 std::shared_ptr<XMLCompositeBuilder> BuildEnvelope(const std::shared_ptr<XMLBaseBuilder>& header,
                                                    const std::shared_ptr<XMLBaseBuilder>& body);
 
-/// Looks for the ids of a request's own certificate and signature inside of the tokens that it
-/// carries: a service that found two elements of one id would refuse the request, or take the wrong
-/// one. `envelope` has its certificate, if it is to have one, but not its signature. Throws
-/// `Tarnik::InvalidArgumentException`.
-void RequireOwnIds(const Tarnik::Xml::ElementNode& envelope);
-
 /// An envelope whose Body and Timestamp are signed (Web Services Security: SOAP Message Security
-/// 1.0, section 8) with RSA-SHA256 over exclusive canonical XML. Each build draws new ids.
+/// 1.0, section 8) with RSA-SHA256 over exclusive canonical XML. Each build generates new ids.
 class XMLSignedSoapBuilder final : public XMLBaseBuilder {
  public:
   /// `header` builds a wsse:Security element with a wsu:Timestamp. `keyInfo` builds the content of
-  /// ds:KeyInfo and may be empty.
+  /// ds:KeyInfo and may be null.
   XMLSignedSoapBuilder(std::shared_ptr<XMLBaseBuilder> header, std::shared_ptr<XMLBaseBuilder> body,
                        Tarnik::Ref<const Tarnik::Crypto::PrivateKey> privateKey,
                        std::shared_ptr<XMLBaseBuilder> keyInfo);
 
   /// Throws `Tarnik::Xml::Security::XmlSecurityException` when the key cannot sign, and
-  /// `Tarnik::InvalidArgumentException` when a token carries an id of the request's own; `out` then
-  /// holds an envelope without a signature.
+  /// `Tarnik::InvalidArgumentException` as `RejectReservedIds` does; `out` then holds an envelope
+  /// without a signature.
   void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const override;
 
  private:
@@ -57,6 +51,12 @@ std::shared_ptr<XMLSignedSoapBuilder> MakeSignedSoapBuilderForCertificate(
     const std::shared_ptr<XMLBaseBuilder>& header, const std::shared_ptr<XMLBaseBuilder>& body,
     const Tarnik::Ref<const Tarnik::Crypto::PrivateKey>& privateKey,
     const Tarnik::Crypto::Certificate& certificate);
+
+/// Throws `Tarnik::InvalidArgumentException` when a token in the request has the id of the
+/// request's own certificate or signature: a service that finds two elements with one id would
+/// refuse the request, or use the wrong element. `envelope` already contains its certificate, if
+/// there is one, but not its signature.
+void RejectReservedIds(const Tarnik::Xml::ElementNode& envelope);
 
 }  // namespace SsoClient
 

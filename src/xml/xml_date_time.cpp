@@ -44,4 +44,10 @@ Tarnik::System::DateTime AddMinutes(const Tarnik::System::DateTime& time, std::u
                                          false);
 }
 
+void AddCreatedAndExpires(XMLCompositeBuilder& element, const Tarnik::System::DateTime& created,
+                          const Tarnik::System::DateTime& expires) {
+  element.Add(MakeTextElementBuilder("wsu", "Created", FormatXmlDateTime(created)))
+      .Add(MakeTextElementBuilder("wsu", "Expires", FormatXmlDateTime(expires)));
+}
+
 }  // namespace SsoClient

@@ -1,4 +1,4 @@
-#include "sts/response_reading.h"
+#include "support/xml_documents.h"
 
 #include <gmock/gmock.h>
 

@@ -1,4 +1,4 @@
-#include "sts/response_reading.h"
+#include "sts/soap_fault.h"
 
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>

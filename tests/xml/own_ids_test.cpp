@@ -14,7 +14,7 @@ namespace {
 std::string Complaint(const std::string& xml) {
   const auto document = Testing::ParseXml(xml);
   return TestSupport::ThrownMessage<Tarnik::InvalidArgumentException>(
-      [&] { RequireOwnIds(*document->RootElement()); });
+      [&] { RejectReservedIds(*document->RootElement()); });
 }
 
 TEST(OwnIdsTest, AcceptsOtherIdsAndOneCertificate) {

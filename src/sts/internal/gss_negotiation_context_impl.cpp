@@ -2,10 +2,19 @@
 
 #include <utility>
 
+#include "sts/holder_of_key_check.h"
 #include "sts/negotiation_leg.h"
 #include "support/secret_text.h"
+#include "transport/https_client.h"
 
 namespace SsoClient::InternalApi {
+
+namespace {
+
+// A leg should take less time than a whole operation.
+constexpr unsigned long kTimeoutMicroseconds = 40'000'000;
+
+}  // namespace
 
 GssNegotiationContextImpl::GssNegotiationContextImpl(
     TokenSpec spec, std::shared_ptr<const RequestBuilder> requestBuilder,
@@ -31,6 +40,18 @@ GssNegotiationResult GssNegotiationContextImpl::Negotiate(
     result.token = CreateSamlToken(assertion.text, keyInfoResolver_.get());
   }
   return result;
+}
+
+std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(
+    const SecurityTokenServiceConfig& config, const TokenSpec& spec) {
+  CheckHolderOfKeyConfig(config.holderOfKeyConfig);
+  const auto requestBuilder = std::make_shared<RequestBuilderImpl>(config.holderOfKeyConfig);
+  const HttpsClient client(config.url, config.sslContext, config.sslPeerName, kTimeoutMicroseconds,
+                           false);
+  const auto responseHandler = std::make_shared<ResponseHandlerImpl>();
+  return std::make_shared<GssNegotiationContextImpl>(
+      spec, requestBuilder, client.CreateSession(), responseHandler,
+      Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver>(config.keyInfoResolver));
 }
 
 }  // namespace SsoClient::InternalApi

@@ -13,7 +13,7 @@
 
 namespace SsoClient::InternalApi {
 
-/// Negotiates through three parts, none of which may be null.
+/// Uses three parts, none of which may be null.
 class GssNegotiationContextImpl final : public virtual GssNegotiationContext {
  public:
   /// `keyInfoResolver` may be null.

@@ -1,58 +1,18 @@
-#include "sts/response_reading.h"
+#include "sts/soap_fault.h"
 
 #include <algorithm>
 #include <array>
+#include <string>
+#include <string_view>
 
 #include <ssoclient/exceptions.h>
-#include <tarnik/core/checked_cast.h>
-#include <tarnik/core/writer.h>
-#include <tarnik/xml/security/canonicalizer.h>
 
 #include "support/namespaces.h"
 #include "support/qname.h"
+#include "support/xml_documents.h"
+#include "xml/ws_trust_names.h"
 
 namespace SsoClient {
-
-using Tarnik::Xml::ElementNode;
-using Tarnik::Xml::TextNode;
-
-const TextNode* FirstTextChild(const ElementNode* element) {
-  if (element == nullptr) {
-    return nullptr;
-  }
-  const auto* child = element->FirstChild();
-  if (child == nullptr || child->Kind() != Tarnik::Xml::NodeKind::kText) {
-    return nullptr;
-  }
-  return Tarnik::CheckedCast<const TextNode>(child);
-}
-
-std::string_view ElementText(const ElementNode* element) {
-  const auto* text = FirstTextChild(element);
-  return text == nullptr ? std::string_view() : text->Text();
-}
-
-const ElementNode* FindDescendant(const ElementNode& element,
-                                  std::initializer_list<std::string_view> path) {
-  const ElementNode* current = &element;
-  for (const auto localName : path) {
-    current = current->FirstChildElement(localName);
-    if (current == nullptr) {
-      return nullptr;
-    }
-  }
-  return current;
-}
-
-std::string CanonicalizeElement(const ElementNode* element) {
-  if (element == nullptr) {
-    return {};
-  }
-  const auto writer = Tarnik::CreateStringWriter();
-  Tarnik::Xml::Security::CreateCanonicalizer("http://www.w3.org/TR/2001/REC-xml-c14n-20010315#")
-      ->Canonicalize(element, writer.get());
-  return writer->TakeText();
-}
 
 namespace {
 
@@ -65,10 +25,10 @@ struct FaultCode {
   }
 };
 
-constexpr FaultCode kFailedAuthentication = {kWstNamespace, "FailedAuthentication"};
+constexpr FaultCode kFailedAuthentication = {kWsTrust13.namespaceUri, "FailedAuthentication"};
 constexpr std::array kRejectedCredentials = {
     kFailedAuthentication,
-    FaultCode{kWstNamespace, "InvalidSecurityToken"},
+    FaultCode{kWsTrust13.namespaceUri, "InvalidSecurityToken"},
     FaultCode{kWsseNamespace, "InvalidSecurityToken"},
 };
 
