@@ -14,8 +14,8 @@ using Tarnik::DatePrintFormatter;
 using Tarnik::Detail::ASPrintInternal;
 using Tarnik::System::DateTime;
 
-// A separator stands in front of an item once anything was written before, so items that are
-// described by an empty text leave no trace.
+// Writes a separator before an item only when the text so far is not empty, so leading items with
+// an empty description leave no trace.
 template <class Items>
 std::string JoinByLength(const Items& items) {
   std::string text;
@@ -28,7 +28,7 @@ std::string JoinByLength(const Items& items) {
   return text;
 }
 
-// A separator stands between any two items, empty ones included.
+// Writes a separator between any two items, including empty ones.
 template <class Texts>
 std::string JoinByPosition(const Texts& items) {
   std::string text;

@@ -53,7 +53,7 @@ constexpr int kMaxLegs = 1000;
 void CountLeg(int& legs) {
   if (++legs > kMaxLegs) {
     throw CommunicationException("The service asks for more than " + std::to_string(kMaxLegs) +
-                                 " legs of SPNego.");
+                                 " legs of SPNEGO.");
   }
 }
 

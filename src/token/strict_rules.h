@@ -13,8 +13,7 @@
 #include "support/qname.h"
 #include "token/child_cursor.h"
 
-// The rules for the attributes and the text of an element. Whatever a rule does not allow is a
-// `ParseException`.
+// The rules for the attributes and the text of an element. A violation causes `ParseException`.
 namespace SsoClient {
 
 /// The expanded name of xsi:type; elements may bind its namespace to any prefix.
@@ -35,7 +34,7 @@ void CheckEachAttribute(const Tarnik::Xml::ElementNode& element,
 /// The value of xsi:type, if the element has it.
 std::optional<std::string_view> FindTypeAttribute(const Tarnik::Xml::ElementNode& element);
 
-/// For elements that are read the same way whatever their type: throws `ParseException` when
+/// For elements that are read the same way for any type: throws `ParseException` when
 /// xsi:type is present with an undeclared prefix, because such a value names no type.
 void CheckTypeIsNameable(const Tarnik::Xml::ElementNode& element);
 

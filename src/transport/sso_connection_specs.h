@@ -22,7 +22,7 @@ class SsoCustomConnectionSpecImpl final : public virtual Tarnik::Http::CustomCon
   /// "<cs p:ADDRESS, SsoCustomConnectionSpec:HOST:PORT>".
   std::string ToString() const override;
 
-  /// These three return the configured host, whatever host is connected to.
+  /// These three are about the configured host, even when a replacement host is connected to.
   std::string Host() const override;
   std::string CookieHost() const override;
   std::string EndpointKey() const override;

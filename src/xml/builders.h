@@ -120,7 +120,7 @@ std::shared_ptr<XMLCompositeBuilder> MakeCompositeBuilder(std::string_view prefi
                                                           std::string_view localName,
                                                           const AttributeList& attributes = {});
 
-/// The token's root element, parsed from its text, so that a request carries the bytes that the
+/// The token's root element, parsed from its text, so that a request contains the bytes that the
 /// issuer signed. Throws `Tarnik::Xml::XMLParseException` for malformed text.
 std::shared_ptr<XMLBaseBuilder> MakeTokenElementBuilder(const SamlToken& token);
 

@@ -24,7 +24,7 @@ constexpr char kSignatureMethod[] = "http://www.w3.org/2001/04/xmldsig-more#rsa-
 constexpr char kExclusiveC14n[] = "http://www.w3.org/2001/10/xml-exc-c14n#";
 constexpr char kSha256[] = "http://www.w3.org/2001/04/xmlenc#sha256";
 
-// Whatever its namespace: services differ in which attributes they use as ids.
+// In any namespace: services differ in which attributes they use as ids.
 bool IsSpelledLikeAnId(std::string_view localName) {
   return localName == "Id" || localName == "ID" || localName == "id";
 }

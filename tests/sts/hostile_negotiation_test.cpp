@@ -171,7 +171,7 @@ TEST(HostileNegotiationLoopTest, EndsWhenTheServiceNeverDoes) {
     ListeningHandler handler;
     EXPECT_EQ(ThrownMessage<CommunicationException>(
                   [&] { service.AcquireTokenByGSS(OneHour(), handler); }),
-              "The service asks for more than 1000 legs of SPNego.");
+              "The service asks for more than 1000 legs of SPNEGO.");
     EXPECT_EQ(transport->bodies.size(), 1000U);
     EXPECT_EQ(handler.received.size(), 1000U);
   }
