@@ -1,5 +1,5 @@
-// Acquires a token by password that is bound to a key, and keeps its text in a file: without the
-// key, the file is of no use to anyone.
+// Acquires a holder-of-key token by password and saves its text to a file. Without the private key,
+// the file is of no use to anyone.
 #include <ssoclient/ssoclient.h>
 
 #include <fstream>

@@ -1,4 +1,4 @@
-// Acquires a bearer token by user name and password without waiting for it at once.
+// Acquires a bearer token by user name and password, asynchronously.
 #include <ssoclient/ssoclient.h>
 
 #include <future>

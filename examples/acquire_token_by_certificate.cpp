@@ -1,4 +1,4 @@
-// Acquires a token for the owner of a certificate, by proving possession of its key.
+// Acquires a token for the owner of a certificate. The request is signed with the private key.
 #include <ssoclient/ssoclient.h>
 
 #include <iostream>

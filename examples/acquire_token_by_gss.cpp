@@ -1,5 +1,5 @@
-// Acquires a token without a password, by Kerberos: with the tickets of the process's default
-// credential cache, or with a keytab.
+// Acquires a token by Kerberos: with the tickets in the process's default credential cache, or with
+// a keytab.
 #include <ssoclient/gssapi_negotiation_handler.h>
 #include <ssoclient/ssoclient.h>
 

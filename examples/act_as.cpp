@@ -1,5 +1,5 @@
-// Acquires a token by which the owner of a certificate acts on behalf of the user whose delegable
-// token it was handed.
+// Acquires a token with which the owner of a certificate acts on behalf of a user. The user's own
+// token must be delegable.
 #include <ssoclient/ssoclient.h>
 
 #include <fstream>

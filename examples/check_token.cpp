@@ -1,5 +1,5 @@
-// The receiving side: decides whether to let somebody in who comes with a token. The certificate is
-// the one with which the peer has proved its identity, in a TLS handshake for instance.
+// The receiving side: decides whether to accept a token that a peer presents. PEER_CERTIFICATE is
+// the certificate with which the peer proved its identity, for example in a TLS handshake.
 #include <ssoclient/ssoclient.h>
 
 #include <cstring>
@@ -35,9 +35,9 @@ int main(int argc, char** argv) {
     token->GetAudiences(audiences);
     const auto holder = token->HolderOfKeyCertificate();
     if (!audiences.empty() && audiences.count(argv[4]) == 0) {
-      std::cout << "refused: the token is meant for others\n";
+      std::cout << "refused: the token is for other audiences\n";
     } else if (holder != nullptr && !IsSame(*holder, *peer)) {
-      std::cout << "refused: the token belongs to another key\n";
+      std::cout << "refused: the token is bound to another key\n";
     } else {
       std::cout << "accepted: " << token->Subject().name << '@' << token->Subject().domain << '\n';
     }

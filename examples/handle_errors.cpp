@@ -1,4 +1,4 @@
-// Tells what to do about each way in which a login may fail.
+// Shows how to handle each kind of failure of a login.
 #include <ssoclient/ssoclient.h>
 
 #include <iostream>
@@ -29,15 +29,15 @@ int main(int argc, char** argv) {
   } catch (const SsoClient::InvalidCredentialsException&) {
     std::cout << "ask for user name and password again\n";
   } catch (const SsoClient::PasswordExpiredException&) {
-    std::cout << "send the user to where passwords are changed\n";
+    std::cout << "ask the user to change the password\n";
   } catch (const SsoClient::CommunicationException& e) {
     std::cout << "try again later, and tell the operator: " << e.what() << '\n';
   } catch (const SsoClient::InvalidTokenException& e) {
-    std::cout << "do not try again; check trusted certificates and clocks: " << e.what() << '\n';
+    std::cout << "do not retry; check trusted certificates and clocks: " << e.what() << '\n';
   } catch (const SsoClient::SsoException& e) {
-    std::cout << "the service refuses: " << e.what() << '\n';
+    std::cout << "the request failed: " << e.what() << '\n';
   } catch (const Tarnik::Exception& e) {
-    std::cout << "mend the configuration or the call: " << e.what() << '\n';
+    std::cout << "fix the configuration or the call: " << e.what() << '\n';
   }
   return 0;
 }

@@ -1,5 +1,5 @@
-// Loads a private key and its certificate from wherever they are kept. The passphrase, or a
-// device's PIN, is asked for only if there is need of one.
+// Loads a private key and its certificate from files or a device. The passphrase or PIN is read
+// only if the key needs one.
 #include <ssoclient/ssoclient.h>
 
 #include <iostream>
@@ -37,7 +37,8 @@ int main(int argc, char** argv) {
     const auto config = Load(argv[1], argc == 3 ? argv[2] : "");
     const bool isPair = config.privateKey->Matches(*config.certificate);
     std::cout << (isPair ? "the key of " : "NOT the key of ") << config.certificate->SubjectName()
-              << ", which is valid until " << config.certificate->NotAfter().ToString() << '\n';
+              << "; its certificate is valid until " << config.certificate->NotAfter().ToString()
+              << '\n';
     return 0;
   } catch (const std::exception& e) {
     std::cerr << "No key: " << e.what() << '\n';

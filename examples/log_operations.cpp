@@ -1,4 +1,4 @@
-// Sends the library's log lines, down to the steps of each operation, where the server logs.
+// Sends the library's log lines, including the steps of each operation, to the server's own log.
 #include <ssoclient/ssoclient.h>
 #include <tarnik/service/log.h>
 
@@ -12,7 +12,7 @@ int main(int argc, char** argv) {
   }
   std::string password;
   std::getline(std::cin, password);
-  // Before other threads of the process use the library.
+  // First, so that no line goes to the default sink.
   Tarnik::Service::SetLogLevel("SsoClient", 7);
   Tarnik::Service::SetLogSink([](const Tarnik::Service::LogRecord& line) {
     std::cout << '[' << line.level << "] " << line.text << '\n';

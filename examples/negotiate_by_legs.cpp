@@ -1,5 +1,5 @@
-// Acquires a token by Kerberos with one call for each leg, for servers that carry the legs between
-// the service and somebody else who makes them.
+// Acquires a token by Kerberos with one call per leg. This is for servers that relay the legs
+// between the service and a client that makes them.
 #include <ssoclient/gssapi_negotiation_handler.h>
 #include <ssoclient/ssoclient.h>
 
@@ -33,7 +33,7 @@ int main(int argc, char** argv) {
       answer = negotiation->Negotiate(*user->Negotiate(*answer.outputLeg));
     }
     if (!answer.outputLeg->empty()) {
-      user->Negotiate(*answer.outputLeg);  // proves to the user that it is the service
+      user->Negotiate(*answer.outputLeg);  // verifies the identity of the service
     }
     std::cout << SsoClient::CreateSamlTokenDescription(*answer.token) << '\n';
     return 0;

@@ -1,4 +1,4 @@
-// Gives a renewable token, which is bound to the key, a new lifetime.
+// Renews a token that is renewable and bound to the key.
 #include <ssoclient/ssoclient.h>
 
 #include <fstream>

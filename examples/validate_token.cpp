@@ -1,4 +1,4 @@
-// Asks the service whether it still stands by a token.
+// Asks the service whether a token is still valid.
 #include <ssoclient/ssoclient.h>
 
 #include <fstream>
@@ -32,7 +32,7 @@ int main(int argc, char** argv) {
               << SsoClient::CreateSamlTokenDescription(*token) << '\n';
     return 0;
   } catch (const std::exception& e) {
-    std::cerr << "No verdict: " << e.what() << '\n';
+    std::cerr << "Not validated: " << e.what() << '\n';
     return 1;
   }
 }
