@@ -3,13 +3,13 @@
 #include <stdexcept>
 #include <utility>
 
-#include "connection_threads.h"
-#include "conversation.h"
-#include "listener.h"
-#include "misbehavior_plan.h"
-#include "observation.h"
-#include "service.h"
-#include "tls_context.h"
+#include "operations/service.h"
+#include "wire/connection_threads.h"
+#include "wire/conversation.h"
+#include "wire/listener.h"
+#include "wire/misbehavior_plan.h"
+#include "wire/observation.h"
+#include "wire/tls_context.h"
 
 namespace DevSts {
 namespace {

@@ -1,5 +1,5 @@
 // What SPNEGO's messages are like that the service reads itself, and that no other does it harm.
-#include "spnego_token.h"
+#include "kerberos/spnego_token.h"
 
 #include <gmock/gmock.h>
 
