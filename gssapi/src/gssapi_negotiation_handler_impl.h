@@ -9,9 +9,8 @@
 #include <string>
 #include <vector>
 
-#include "gss_credentials.h"
-#include "gss_handle.h"
-#include "memory_cache.h"
+#include "credentials.h"
+#include "handles.h"
 
 namespace SsoClient {
 

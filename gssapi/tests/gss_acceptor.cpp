@@ -1,9 +1,10 @@
 #include "gss_acceptor.h"
 
 #include <gssapi/gssapi_ext.h>
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
 
-#include "gss_error.h"
+#include "errors.h"
 
 namespace SsoClient::Testing {
 
@@ -49,6 +50,24 @@ std::vector<unsigned char> GssAcceptor::Accept(const std::vector<unsigned char>&
   }
   const auto* bytes = static_cast<const unsigned char*>(output.Get().value);
   return {bytes, bytes + output.Get().length};
+}
+
+void ExpectLogin(GssapiNegotiationHandler& handler, const std::string& keytab,
+                 const std::string& client) {
+  GssAcceptor acceptor(keytab);
+  const auto first = handler.Negotiate({});
+  ASSERT_NE(first, nullptr);
+  EXPECT_FALSE(handler.IsEstablished());
+  const auto answer = acceptor.Accept(*first);
+  EXPECT_EQ(acceptor.error, "");
+  EXPECT_TRUE(acceptor.isEstablished);
+  EXPECT_EQ(acceptor.clientName, client);
+  ASSERT_FALSE(answer.empty());
+
+  const auto last = handler.Negotiate(answer);
+  ASSERT_NE(last, nullptr);
+  EXPECT_TRUE(last->empty());
+  EXPECT_TRUE(handler.IsEstablished());
 }
 
 }  // namespace SsoClient::Testing

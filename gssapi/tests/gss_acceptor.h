@@ -2,11 +2,12 @@
 #define SSOCLIENT_GSSAPI_TESTS_GSS_ACCEPTOR_H
 
 #include <gssapi/gssapi.h>
+#include <ssoclient/gssapi_negotiation_handler.h>
 
 #include <string>
 #include <vector>
 
-#include "gss_handle.h"
+#include "handles.h"
 
 namespace SsoClient::Testing {
 
@@ -28,6 +29,10 @@ class GssAcceptor {
   GssCredential credentials_;
   GssContext context_;
 };
+
+/// Negotiates with a service that has the keys of `keytab`, and expects it to see `client` log in.
+void ExpectLogin(GssapiNegotiationHandler& handler, const std::string& keytab,
+                 const std::string& client);
 
 }  // namespace SsoClient::Testing
 

@@ -2,10 +2,17 @@
 // Kerberos.
 #include <ssoclient/gssapi_negotiation_handler.h>
 
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
 #include <tarnik/text/string_util.h>
 
 #include <boost/none.hpp>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
 
 #include "gss_acceptor.h"
 #include "realm_fixture.h"
@@ -19,10 +26,9 @@
 #include "support/assertion_text.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using Testing::GssAcceptor;
 using TestSupport::ThrownMessage;
 
 using Leg = std::vector<unsigned char>;
@@ -49,14 +55,14 @@ std::string Exchange(const Leg& leg) {
 }
 
 std::string LegAnswer(const Leg& leg) {
-  return Testing::Envelope(Testing::Rstr(Exchange(leg), " Context=\"c\""));
+  return Envelope(Rstr(Exchange(leg), " Context=\"c\""));
 }
 
 std::string TokenAnswer(const Leg& leg) {
-  return Testing::Envelope(Testing::Collection(Testing::Rstr(
-      Exchange(leg) + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
-          Testing::Requested(TestSupport::AssertionText().ToXml()),
-      " Context=\"c\"")));
+  return Envelope(Collection(
+      Rstr(Exchange(leg) + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
+               Requested(TestSupport::AssertionText().ToXml()),
+           " Context=\"c\"")));
 }
 
 // A service's end of one connection.
@@ -110,14 +116,14 @@ TokenSpec OneHour() {
   return spec;
 }
 
-class NegotiatedLoginTest : public Testing::RealmFixture {
+class NegotiatedLoginTest : public RealmFixture {
  protected:
   std::shared_ptr<const SamlToken> Acquire(const Behavior& behavior) {
     service_ = std::make_shared<Service>(serviceKeytab, behavior);
     return SecurityTokenServiceImpl(std::make_shared<RequestBuilderImpl>(boost::none),
                                     std::make_shared<OneService>(service_),
                                     std::make_shared<ResponseHandlerImpl>(),
-                                    std::make_shared<Testing::FakeTokenFactory>())
+                                    std::make_shared<FakeTokenFactory>())
         .AcquireTokenByGSS(OneHour(), *handler_);
   }
 
@@ -174,7 +180,7 @@ TEST_F(NegotiatedLoginTest, ServesOneLoginAfterTheOther) {
 
 // The line is about the empty answer to the last leg. It means no harm.
 TEST_F(NegotiatedLoginTest, IsLoggedForItsLastLeg) {
-  const Testing::LogCapture log(4);
+  const LogCapture log(4);
   Acquire({});
   EXPECT_THAT(log.Lines(),
               testing::ElementsAre(
@@ -201,4 +207,4 @@ TEST_F(NegotiatedLoginTest, IsMadeLegByLegWithAContext) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

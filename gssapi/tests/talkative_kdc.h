@@ -3,6 +3,7 @@
 
 #include <string>
 #include <thread>
+#include <vector>
 
 #include "transport/loopback_server.h"
 
@@ -29,6 +30,9 @@ class TalkativeKdc {
 
 /// A KRB-ERROR with the code KRB_ERR_GENERIC.
 std::string KerberosError(std::string text);
+/// The leg of a service that refuses a login with such an error, in the frames of RFC 4121,
+/// section 4.1, and of RFC 4178.
+std::vector<unsigned char> RefusalWith(const std::string& text);
 
 }  // namespace SsoClient::Testing
 

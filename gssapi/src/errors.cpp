@@ -1,4 +1,10 @@
-#include "plain_text.h"
+#include "errors.h"
+
+#include <ssoclient/exceptions.h>
+
+#include <cstddef>
+
+#include "handles.h"
 
 namespace SsoClient {
 
@@ -58,6 +64,22 @@ bool IsDroppedAtTheEnd(char c) {
   return c == ' ' || IsControl({&c, 1});
 }
 
+std::string TextsOf(OM_uint32 code, int type) {
+  std::string texts;
+  OM_uint32 next = 0;
+  do {
+    OM_uint32 minor = 0;
+    GssBuffer text;
+    if (GSS_ERROR(gss_display_status(&minor, code, type, GSS_C_NO_OID, &next, text.Address())) !=
+        0) {
+      break;
+    }
+    texts += texts.empty() ? "" : ", ";
+    texts += PlainText({static_cast<const char*>(text.Get().value), text.Get().length});
+  } while (next != 0);
+  return texts;
+}
+
 }  // namespace
 
 std::string PlainText(std::string_view text) {
@@ -76,6 +98,17 @@ std::string PlainText(std::string_view text) {
     text.remove_prefix(character.empty() ? 1 : character.size());
   }
   return plain;
+}
+
+void CheckGssStatus(const std::string& attempt, const GssStatus& status) {
+  if (GSS_ERROR(status.major) == 0) {
+    return;
+  }
+  std::string message = attempt + ": " + TextsOf(status.major, GSS_C_GSS_CODE);
+  if (status.minor != 0) {
+    message += " (" + TextsOf(status.minor, GSS_C_MECH_CODE) + ")";
+  }
+  throw SsoException(message + ".");
 }
 
 }  // namespace SsoClient

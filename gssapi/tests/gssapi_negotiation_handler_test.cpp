@@ -1,28 +1,34 @@
-#include "gssapi_negotiation_handler_impl.h"
+#include <ssoclient/gssapi_negotiation_handler.h>
 
+#include <gmock/gmock.h>
+#include <gssapi/gssapi.h>
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
+#include <sys/socket.h>
 #include <tarnik/core/exception.h>
 
 #include <chrono>
+#include <cstddef>
 #include <filesystem>
 #include <future>
+#include <memory>
+#include <string>
 #include <thread>
+#include <vector>
 
 #include "calls/freed_memory.h"
-#include "expect_login.h"
-#include "init_sec_context_script.h"
+#include "gss_acceptor.h"
+#include "gssapi_negotiation_handler_impl.h"
 #include "realm_fixture.h"
+#include "replaced_calls.h"
 #include "support/thrown_message.h"
 #include "talkative_kdc.h"
 #include "transport/loopback_server.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using Testing::GssAcceptor;
 using testing::HasSubstr;
-using Testing::InitResult;
-using Testing::InitSecContextScript;
 using TestSupport::ThrownMessage;
 using namespace std::chrono_literals;
 
@@ -46,7 +52,7 @@ Leg EmptyAnswer(unsigned char state) {
           0x06, 0x09, 0x2a, 0x86, 0x48, 0x86, 0xf7, 0x12, 0x01,  0x02, 0x02};
 }
 
-class GssapiNegotiationHandlerImplTest : public Testing::RealmFixture {
+class GssapiNegotiationHandlerTest : public RealmFixture {
  protected:
   static void ExpectLogin(GssapiNegotiationHandler& handler) {
     Testing::ExpectLogin(handler, serviceKeytab, kAlice);
@@ -75,14 +81,14 @@ class GssapiNegotiationHandlerImplTest : public Testing::RealmFixture {
   }
 };
 
-TEST_F(GssapiNegotiationHandlerImplTest, ServesOneNegotiationAfterTheOther) {
+TEST_F(GssapiNegotiationHandlerTest, ServesOneNegotiationAfterTheOther) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   ExpectLogin(handler);
   ExpectLogin(handler);
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, HasThePeerProveItselfAndDelegatesNothing) {
+TEST_F(GssapiNegotiationHandlerTest, HasThePeerProveItselfAndDelegatesNothing) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   GssAcceptor acceptor(serviceKeytab);
   acceptor.Accept(*handler.Negotiate({}));
@@ -91,7 +97,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, HasThePeerProveItselfAndDelegatesNothin
   EXPECT_EQ(acceptor.flags & GSS_C_DELEG_FLAG, 0U);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, HasNothingToSayAfterTheEnd) {
+TEST_F(GssapiNegotiationHandlerTest, HasNothingToSayAfterTheEnd) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   const Leg answer = AnswerTo(handler);
   for (const Leg& leg : {answer, answer, Leg{1, 2, 3}}) {
@@ -102,7 +108,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, HasNothingToSayAfterTheEnd) {
   }
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, EndsWithAServiceThatAsksOnAndOn) {
+TEST_F(GssapiNegotiationHandlerTest, EndsWithAServiceThatAsksOnAndOn) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   const Leg answer = AnswerTo(handler);
   for (int legs = 1; legs < 100; ++legs) {
@@ -113,7 +119,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, EndsWithAServiceThatAsksOnAndOn) {
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, BeginsAnewWithAnEmptyLegInTheMiddle) {
+TEST_F(GssapiNegotiationHandlerTest, BeginsAnewWithAnEmptyLegInTheMiddle) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   const Leg answerToTheFirst = AnswerTo(handler);
   ExpectLogin(handler);
@@ -123,7 +129,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, BeginsAnewWithAnEmptyLegInTheMiddle) {
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, RefusesALegBeforeTheFirst) {
+TEST_F(GssapiNegotiationHandlerTest, RefusesALegBeforeTheFirst) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidStateException>([&] {
               handler.Negotiate({1, 2, 3});
@@ -132,7 +138,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, RefusesALegBeforeTheFirst) {
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, FindsRenewedTickets) {
+TEST_F(GssapiNegotiationHandlerTest, FindsRenewedTickets) {
   auto config = ConfigOf("alice");
   const std::string fresh = config.credentialCache;
   realm->SetClock(-1h);
@@ -145,7 +151,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, FindsRenewedTickets) {
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, NeedsNoRealmForTicketsThatItHas) {
+TEST_F(GssapiNegotiationHandlerTest, NeedsNoRealmForTicketsThatItHas) {
   GssapiNegotiationHandlerImpl handler(MachineConfig());
   Testing::ExpectLogin(handler, serviceKeytab, "machine@EXAMPLE.COM");
   realm->StopKdc();
@@ -153,7 +159,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, NeedsNoRealmForTicketsThatItHas) {
   realm->SetClock(0s);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, MayBeUsedByAnotherThreadThanItsMaker) {
+TEST_F(GssapiNegotiationHandlerTest, MayBeUsedByAnotherThreadThanItsMaker) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   Leg answer;
   std::thread([&] { answer = AnswerTo(handler); }).join();
@@ -161,7 +167,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, MayBeUsedByAnotherThreadThanItsMaker) {
   EXPECT_TRUE(handler.IsEstablished());
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, ThreadsLogInSideBySide) {
+TEST_F(GssapiNegotiationHandlerTest, ThreadsLogInSideBySide) {
   const auto alice = ConfigOf("alice");
   const auto machine = MachineConfig();
   std::vector<std::thread> threads;
@@ -188,7 +194,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, ThreadsLogInSideBySide) {
   }
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, RefusesASecondThreadInTheSameCall) {
+TEST_F(GssapiNegotiationHandlerTest, RefusesASecondThreadInTheSameCall) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   std::promise<void> isInside;
   std::promise<void> mayGoOn;
@@ -208,7 +214,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, RefusesASecondThreadInTheSameCall) {
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, TellsThatThereAreNoCredentials) {
+TEST_F(GssapiNegotiationHandlerTest, TellsThatThereAreNoCredentials) {
   auto config = ConfigOf("alice");
   config.credentialCache = "FILE:/nonexistent/other";
   GssapiNegotiationHandlerImpl handler(config);
@@ -218,7 +224,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, TellsThatThereAreNoCredentials) {
   EXPECT_FALSE(handler.IsEstablished());
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, TellsOfAnUnknownService) {
+TEST_F(GssapiNegotiationHandlerTest, TellsOfAnUnknownService) {
   auto config = ConfigOf("alice");
   config.targetService = "HTTP@unknown";
   GssapiNegotiationHandlerImpl handler(config);
@@ -227,7 +233,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, TellsOfAnUnknownService) {
             "more information (Server HTTP/unknown@EXAMPLE.COM not found in Kerberos database).");
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, TellsOfClocksTooFarApart) {
+TEST_F(GssapiNegotiationHandlerTest, TellsOfClocksTooFarApart) {
   auto config = ConfigOf("alice");
   config.credentialCache = realm->Login("alice", "secret", 9h);
   realm->SetClock(1h);
@@ -237,7 +243,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, TellsOfClocksTooFarApart) {
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, TellsThatTheRealmDoesNotAnswer) {
+TEST_F(GssapiNegotiationHandlerTest, TellsThatTheRealmDoesNotAnswer) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   realm->StopKdc();
   EXPECT_EQ(Failure(handler), Failed("Cannot contact any KDC for realm 'EXAMPLE.COM'"));
@@ -246,11 +252,11 @@ TEST_F(GssapiNegotiationHandlerImplTest, TellsThatTheRealmDoesNotAnswer) {
 }
 
 // Kerberos gives a KDC some half a minute.
-TEST_F(GssapiNegotiationHandlerImplTest, DoesNotHangWithASilentRealm) {
+TEST_F(GssapiNegotiationHandlerTest, DoesNotHangWithASilentRealm) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   const auto start = std::chrono::steady_clock::now();
   {
-    const Testing::LoopbackSocket kdc;  // connections come about, but nobody accepts them
+    const LoopbackSocket kdc;  // connections come about, but nobody accepts them
     ASSERT_EQ(::listen(kdc.Descriptor(), 16), 0);
     ReplaceKdc(kdc.Port());
     EXPECT_EQ(Failure(handler), Failed("Cannot contact any KDC for realm 'EXAMPLE.COM'"));
@@ -262,7 +268,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, DoesNotHangWithASilentRealm) {
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, TellsThatTheServiceLacksItsKey) {
+TEST_F(GssapiNegotiationHandlerTest, TellsThatTheServiceLacksItsKey) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   GssAcceptor acceptor(machineKeytab);
   const Leg refusal = acceptor.Accept(*handler.Negotiate({}));
@@ -271,40 +277,17 @@ TEST_F(GssapiNegotiationHandlerImplTest, TellsThatTheServiceLacksItsKey) {
   ExpectServesAgain(handler);
 }
 
-// One element of DER (X.690) with a content of less than 256 bytes.
-Leg Element(unsigned char tag, const Leg& content) {
-  EXPECT_LT(content.size(), 0x100U);
-  Leg whole{tag};
-  if (content.size() >= 0x80) {
-    whole.push_back(0x81);
-  }
-  whole.push_back(static_cast<unsigned char>(content.size()));
-  whole.insert(whole.end(), content.begin(), content.end());
-  return whole;
-}
-
-// A service's refusal, a KRB-ERROR in the frames of RFC 4121, section 4.1, and of RFC 4178.
-Leg RefusalWith(const std::string& text) {
-  Leg token{0x06, 0x09, 0x2a, 0x86, 0x48, 0x86, 0xf7, 0x12, 0x01, 0x02, 0x02, 0x03, 0x00};
-  const std::string error = Testing::KerberosError(text);
-  token.insert(token.end(), error.begin(), error.end());
-  Leg fields{0xa0, 0x03, 0x0a, 0x01, 0x01};
-  const Leg response = Element(0xa2, Element(0x04, Element(0x60, token)));
-  fields.insert(fields.end(), response.begin(), response.end());
-  return Element(0xa1, Element(0x30, fields));
-}
-
-TEST_F(GssapiNegotiationHandlerImplTest, DoesNotRepeatWhatAServiceSaysOfItsRefusal) {
+TEST_F(GssapiNegotiationHandlerTest, DoesNotRepeatWhatAServiceSaysOfItsRefusal) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   handler.Negotiate({});
   EXPECT_EQ(Failure(handler, RefusalWith("no\r\nline")), Failed("Generic error (see e-text)"));
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, TellsInOneLineWhatAKdcSaysOfItsRefusal) {
+TEST_F(GssapiNegotiationHandlerTest, TellsInOneLineWhatAKdcSaysOfItsRefusal) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   {
-    const Testing::TalkativeKdc kdc("no\r\nline \x1b[0m");
+    const TalkativeKdc kdc("no\r\nline \x1b[0m");
     ReplaceKdc(kdc.Port());
     EXPECT_EQ(Failure(handler), Failed("KDC returned error string: no??line ?[0m"));
   }
@@ -312,7 +295,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, TellsInOneLineWhatAKdcSaysOfItsRefusal)
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, RefusesTheProofOfAnotherNegotiation) {
+TEST_F(GssapiNegotiationHandlerTest, RefusesTheProofOfAnotherNegotiation) {
   const auto config = ConfigOf("alice");
   GssapiNegotiationHandlerImpl handler(config);
   GssapiNegotiationHandlerImpl other(config);
@@ -322,10 +305,10 @@ TEST_F(GssapiNegotiationHandlerImplTest, RefusesTheProofOfAnotherNegotiation) {
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, LeavesNoLegInMemory) {
+TEST_F(GssapiNegotiationHandlerTest, LeavesNoLegInMemory) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   auto leg = handler.Negotiate({});
-  const Testing::FreedMemory memory(std::string(leg->end() - 40, leg->end()));
+  const FreedMemory memory(std::string(leg->end() - 40, leg->end()));
   leg = nullptr;
   EXPECT_EQ(memory.Finds(), 0);
 }
@@ -336,7 +319,7 @@ struct BadLeg {
   std::string message;
 };
 
-class BadServerLegTest : public GssapiNegotiationHandlerImplTest,
+class BadServerLegTest : public GssapiNegotiationHandlerTest,
                          public testing::WithParamInterface<BadLeg> {};
 
 TEST_P(BadServerLegTest, EndsTheNegotiation) {
@@ -364,7 +347,7 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& instance) { return instance.param.name; });
 
 // Proofs differ in length by a byte or so.
-TEST_F(GssapiNegotiationHandlerImplTest, RefusesAProofCutAtAnyByte) {
+TEST_F(GssapiNegotiationHandlerTest, RefusesAProofCutAtAnyByte) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   Leg proof = AnswerTo(handler);
   for (std::size_t missing = 1; missing < proof.size(); ++missing) {
@@ -378,7 +361,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, RefusesAProofCutAtAnyByte) {
 
 // What the real library is not made to do.
 
-TEST_F(GssapiNegotiationHandlerImplTest, DoesNotWaitForTheServiceWithNothingToSend) {
+TEST_F(GssapiNegotiationHandlerTest, DoesNotWaitForTheServiceWithNothingToSend) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   {
     const InitSecContextScript script([] { return InitResult{GSS_S_CONTINUE_NEEDED, "", 0}; });
@@ -389,7 +372,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, DoesNotWaitForTheServiceWithNothingToSe
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, DemandsThatTheServiceHasProvedItself) {
+TEST_F(GssapiNegotiationHandlerTest, DemandsThatTheServiceHasProvedItself) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   {
     const InitSecContextScript script([] {
@@ -401,7 +384,7 @@ TEST_F(GssapiNegotiationHandlerImplTest, DemandsThatTheServiceHasProvedItself) {
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerImplTest, SendsALastLegOfItsOwn) {
+TEST_F(GssapiNegotiationHandlerTest, SendsALastLegOfItsOwn) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   int legs = 0;
   const InitSecContextScript script([&legs] {
@@ -417,5 +400,53 @@ TEST_F(GssapiNegotiationHandlerImplTest, SendsALastLegOfItsOwn) {
   EXPECT_EQ(legs, 3);
 }
 
+constexpr char kService[] = "HTTP@sts.example";
+const std::string kWithNul("a\0b", 3);
+
+struct BadConfig {
+  const char* name;
+  GssapiNegotiationConfig config;
+  std::string message;
+};
+
+class BadGssapiNegotiationConfigTest : public testing::TestWithParam<BadConfig> {};
+
+TEST_P(BadGssapiNegotiationConfigTest, IsRefusedAtOnce) {
+  EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
+                [] { CreateGssapiNegotiationHandler(GetParam().config); }),
+            "GssapiNegotiationConfig: " + GetParam().message);
+}
+
+std::string NotOfTheForm(const std::string& service) {
+  return "the target service `" + service + "' is not of the form service@host.";
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    All, BadGssapiNegotiationConfigTest,
+    testing::Values(
+        BadConfig{"NoService", {}, "the target service must not be empty."},
+        BadConfig{
+            "NulInService", {kWithNul, "", "", ""}, "the target service must not hold a NUL."},
+        BadConfig{
+            "NulInPrincipal", {kService, kWithNul, "", ""}, "the principal must not hold a NUL."},
+        BadConfig{"NulInKeytab", {kService, "", kWithNul, ""}, "the keytab must not hold a NUL."},
+        BadConfig{"NulInCache",
+                  {kService, "", "", kWithNul},
+                  "the credential cache must not hold a NUL."},
+        BadConfig{"ServiceAlone", {"HTTP", "", "", ""}, NotOfTheForm("HTTP")},
+        BadConfig{"NoHost", {"HTTP@", "", "", ""}, NotOfTheForm("HTTP@")},
+        BadConfig{"NoServiceName", {"@host", "", "", ""}, NotOfTheForm("@host")},
+        BadConfig{"Principal", {"HTTP/host", "", "", ""}, NotOfTheForm("HTTP/host")},
+        BadConfig{"PrincipalWithRealm", {"HTTP/host@A", "", "", ""}, NotOfTheForm("HTTP/host@A")},
+        BadConfig{"TwoHosts", {"HTTP@a@b", "", "", ""}, NotOfTheForm("HTTP@a@b")}),
+    [](const auto& instance) { return instance.param.name; });
+
+TEST(CreateGssapiNegotiationHandlerTest, LooksForNeitherTicketsNorFiles) {
+  const auto handler = CreateGssapiNegotiationHandler(
+      {kService, "machine", "/nonexistent/keytab", "FILE:/nonexistent"});
+  ASSERT_NE(handler, nullptr);
+  EXPECT_FALSE(handler->IsEstablished());
+}
+
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,17 +1,16 @@
-#include "gss_handle.h"
+#include "handles.h"
 
-#include <gmock/gmock.h>
+#include <gssapi/gssapi.h>
+#include <gtest/gtest.h>
 
 #include <cstdlib>
 #include <cstring>
 #include <string>
 
-#include "released_buffers.h"
+#include "replaced_calls.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
-
-using Testing::LastReleasedBuffer;
 
 constexpr char kSecret[] = "what logs somebody in";
 
@@ -44,4 +43,4 @@ TEST(GssBufferTest, MayBeReleasedEmptyAndTwice) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

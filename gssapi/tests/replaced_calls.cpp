@@ -1,4 +1,4 @@
-#include "init_sec_context_script.h"
+#include "replaced_calls.h"
 
 #include <atomic>
 #include <cstdlib>
@@ -6,6 +6,8 @@
 #include <utility>
 
 namespace {
+
+thread_local std::string lastReleased;
 
 std::atomic<const SsoClient::Testing::InitSecContextScript*> current{nullptr};
 
@@ -46,6 +48,13 @@ OM_uint32 __wrap_gss_init_sec_context(OM_uint32* minor, gss_cred_id_t credential
   Copy(result.output, output);
   return result.major;
 }
+
+OM_uint32 __real_gss_release_buffer(OM_uint32*, gss_buffer_t);
+
+OM_uint32 __wrap_gss_release_buffer(OM_uint32* minor, gss_buffer_t buffer) {
+  lastReleased.assign(static_cast<const char*>(buffer->value), buffer->length);
+  return __real_gss_release_buffer(minor, buffer);
+}
 }
 
 namespace SsoClient::Testing {
@@ -57,6 +66,10 @@ InitSecContextScript::InitSecContextScript(std::function<InitResult()> script)
 
 InitSecContextScript::~InitSecContextScript() {
   current = nullptr;
+}
+
+const std::string& LastReleasedBuffer() {
+  return lastReleased;
 }
 
 }  // namespace SsoClient::Testing

@@ -1,23 +1,28 @@
-#include "gss_credentials.h"
+#include "credentials.h"
 
+#include <gtest/gtest.h>
+#include <krb5.h>
 #include <ssoclient/exceptions.h>
 
+#include <chrono>
 #include <filesystem>
 #include <fstream>
+#include <string>
 
-#include "expect_login.h"
+#include "gss_acceptor.h"
 #include "gssapi_negotiation_handler_impl.h"
+#include "handles.h"
 #include "realm_fixture.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using TestSupport::ThrownMessage;
 using namespace std::chrono_literals;
 
 // Credentials are judged by whom a service sees log in with them.
-class GssCredentialsTest : public Testing::RealmFixture {
+class GssCredentialsTest : public RealmFixture {
  protected:
   static void ExpectLogin(const GssapiNegotiationConfig& config, const std::string& client) {
     GssapiNegotiationHandlerImpl handler(config);
@@ -135,5 +140,87 @@ TEST_F(GssCredentialsTest, TellThatTheRealmKnowsNoKeyOfTheKeytab) {
             std::string(kNone) + "(Decrypt integrity check failed).");
 }
 
+class KeytabCheckTest : public RealmFixture {
+ protected:
+  static std::string Complaint(const std::string& keytab, const std::string& principal) {
+    return ThrownMessage<SsoException>([&] { CheckKeytab(keytab, principal); });
+  }
+};
+
+TEST_F(KeytabCheckTest, AcceptsAKeytabWithAFittingKey) {
+  EXPECT_NO_THROW(CheckKeytab(machineKeytab, ""));
+  EXPECT_NO_THROW(CheckKeytab(machineKeytab, "machine"));
+  EXPECT_NO_THROW(CheckKeytab("FILE:" + machineKeytab, "machine@EXAMPLE.COM"));
+}
+
+TEST_F(KeytabCheckTest, TellsThatThereIsNone) {
+  EXPECT_EQ(Complaint("/nonexistent/keytab", "machine"),
+            "The keytab `/nonexistent/keytab' cannot be used: Key table file "
+            "'/nonexistent/keytab' not found.");
+  EXPECT_EQ(Complaint("/nonexistent/keytab", ""),
+            "The keytab `/nonexistent/keytab' cannot be used: Keytab FILE:/nonexistent/keytab is "
+            "nonexistent or empty.");
+}
+
+TEST_F(KeytabCheckTest, TellsThatThePrincipalHasNoKeyInIt) {
+  EXPECT_EQ(Complaint(machineKeytab, "bob"), "The keytab `" + machineKeytab +
+                                                 "' cannot be used: No key table entry found for "
+                                                 "bob@EXAMPLE.COM.");
+}
+
+TEST_F(KeytabCheckTest, TellsThatAFileIsNoKeytab) {
+  EXPECT_EQ(Complaint(realm->ConfigPath(), "machine"),
+            "The keytab `" + realm->ConfigPath() +
+                "' cannot be used: Unsupported key table format version number.");
+}
+
+TEST_F(KeytabCheckTest, TellsThatANameIsNone) {
+  EXPECT_EQ(
+      Complaint(machineKeytab, "a@b@c"),
+      "The keytab `" + machineKeytab + "' cannot be used: Malformed representation of principal.");
+  EXPECT_EQ(Complaint("NONSENSE:keytab", ""),
+            "The keytab `NONSENSE:keytab' cannot be used: Unknown Key table type.");
+}
+
+krb5_ccache Resolve(const Krb5Context& context, const std::string& name) {
+  krb5_ccache cache = nullptr;
+  EXPECT_EQ(krb5_cc_resolve(context.get(), name.c_str(), &cache), 0);
+  return cache;
+}
+
+bool HasOwner(const Krb5Context& context, const std::string& name) {
+  krb5_ccache cache = Resolve(context, name);
+  krb5_principal owner = nullptr;
+  const bool hasOwner = krb5_cc_get_principal(context.get(), cache, &owner) == 0;
+  krb5_free_principal(context.get(), owner);
+  krb5_cc_close(context.get(), cache);
+  return hasOwner;
+}
+
+TEST(MemoryCacheTest, DestroysWhatIsInIt) {
+  const auto context = CreateKrb5Context();
+  ASSERT_NE(context, nullptr);
+  std::string name;
+  {
+    const MemoryCache cache;
+    name = cache.Name();
+    krb5_principal owner = nullptr;
+    ASSERT_EQ(krb5_parse_name(context.get(), "alice@EXAMPLE.COM", &owner), 0);
+    krb5_ccache opened = Resolve(context, name);
+    EXPECT_EQ(krb5_cc_initialize(context.get(), opened, owner), 0);
+    krb5_cc_close(context.get(), opened);
+    krb5_free_principal(context.get(), owner);
+    EXPECT_TRUE(HasOwner(context, name));
+  }
+  EXPECT_FALSE(HasOwner(context, name));
+}
+
+TEST(MemoryCacheTest, BelongsToItsOwnerAlone) {
+  const MemoryCache one;
+  const MemoryCache other;
+  EXPECT_EQ(one.Name().rfind("MEMORY:", 0), 0U);
+  EXPECT_NE(one.Name(), other.Name());
+}
+
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

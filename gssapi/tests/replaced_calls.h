@@ -1,5 +1,5 @@
-#ifndef SSOCLIENT_GSSAPI_TESTS_INIT_SEC_CONTEXT_SCRIPT_H
-#define SSOCLIENT_GSSAPI_TESTS_INIT_SEC_CONTEXT_SCRIPT_H
+#ifndef SSOCLIENT_GSSAPI_TESTS_REPLACED_CALLS_H
+#define SSOCLIENT_GSSAPI_TESTS_REPLACED_CALLS_H
 
 #include <gssapi/gssapi.h>
 
@@ -29,6 +29,9 @@ class InitSecContextScript {
  private:
   std::function<InitResult()> script_;
 };
+
+/// What the buffer contained that this thread released last with gss_release_buffer.
+const std::string& LastReleasedBuffer();
 
 }  // namespace SsoClient::Testing
 

@@ -1,13 +1,19 @@
-#include "gssapi_negotiation_handler_impl.h"
+#include <ssoclient/gssapi_negotiation_handler.h>
 
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/text/string_util.h>
 
+#include <atomic>
+#include <memory>
+#include <string>
 #include <utility>
+#include <vector>
 
-#include "gss_error.h"
-#include "gss_name.h"
+#include "credentials.h"
+#include "errors.h"
+#include "gssapi_negotiation_handler_impl.h"
+#include "handles.h"
 
 namespace SsoClient {
 
@@ -48,6 +54,24 @@ std::shared_ptr<const Leg> HandOut(Leg leg) {
             Tarnik::StringUtil::Cleanse(*handedOut);
             delete handedOut;
           }};
+}
+
+void Require(bool condition, const std::string& demand) {
+  if (!condition) {
+    throw Tarnik::InvalidArgumentException("GssapiNegotiationConfig: " + demand);
+  }
+}
+
+// A principal's own form, "service/host@REALM", would be taken for something else.
+bool IsServiceAtHost(const std::string& name) {
+  const auto at = name.find('@');
+  return at != std::string::npos && at != 0 && at + 1 != name.size() && name.rfind('@') == at &&
+         name.find('/') == std::string::npos;
+}
+
+void RequireNoNul(const std::string& text, const char* field) {
+  Require(text.find('\0') == std::string::npos,
+          std::string("the ") + field + " must not hold a NUL.");
 }
 
 }  // namespace
@@ -137,6 +161,18 @@ Leg GssapiNegotiationHandlerImpl::NextLeg(const Leg& serverLeg) {
   Leg leg = BytesOf(output);
   End(State::kEstablished);
   return leg;
+}
+
+std::shared_ptr<GssapiNegotiationHandler> CreateGssapiNegotiationHandler(
+    const GssapiNegotiationConfig& config) {
+  Require(!config.targetService.empty(), "the target service must not be empty.");
+  RequireNoNul(config.targetService, "target service");
+  RequireNoNul(config.principal, "principal");
+  RequireNoNul(config.keytab, "keytab");
+  RequireNoNul(config.credentialCache, "credential cache");
+  Require(IsServiceAtHost(config.targetService),
+          "the target service `" + config.targetService + "' is not of the form service@host.");
+  return std::make_shared<GssapiNegotiationHandlerImpl>(config);
 }
 
 }  // namespace SsoClient
