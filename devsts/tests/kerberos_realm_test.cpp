@@ -1,5 +1,7 @@
-#include <devsts/kerberos_realm.h>
+#include "devsts/kerberos_realm.h"
 
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <signal.h>
 
 #include <array>
@@ -11,8 +13,9 @@
 #include <iterator>
 #include <memory>
 #include <stdexcept>
+#include <string>
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
 using testing::HasSubstr;
@@ -97,4 +100,4 @@ TEST(KerberosRealmTest, RefusesNamesThatItsToolsWouldReadOtherwise) {
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

@@ -1,28 +1,26 @@
 #include "devsts/misbehavior.h"
 
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
+#include <chrono>
+#include <cstddef>
 #include <memory>
 #include <stdexcept>
+#include <string>
 #include <vector>
 
 #include "devsts/server.h"
 #include "raw_client.h"
 #include "request_text.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
-using Testing::AliceEnvelope;
 using testing::AllOf;
-using Testing::ElementText;
-using Testing::Ending;
 using testing::EndsWith;
 using testing::HasSubstr;
-using Testing::kIssueAction;
 using testing::Not;
-using Testing::PostOf;
-using Testing::RawClient;
 using testing::StartsWith;
 using namespace std::chrono_literals;
 
@@ -48,7 +46,7 @@ std::unique_ptr<RawClient> AskedOverTls(const Server& server) {
   return client;
 }
 
-TEST(Misbehavior, AnswersWithAnyFault) {
+TEST(MisbehaviorTest, AnswersWithAnyFault) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.fault = {"urn:any", "Code", "<why>", false, 500};
@@ -60,7 +58,7 @@ TEST(Misbehavior, AnswersWithAnyFault) {
   EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
 }
 
-TEST(Misbehavior, LeavesPrefixAndFaultStringOut) {
+TEST(MisbehaviorTest, LeavesPrefixAndFaultStringOut) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.fault = {"", "FailedAuthentication", "", true, 200};
@@ -70,7 +68,7 @@ TEST(Misbehavior, LeavesPrefixAndFaultStringOut) {
   EXPECT_THAT(answer, HasSubstr("<faultcode>FailedAuthentication</faultcode></soapenv:Fault>"));
 }
 
-TEST(Misbehavior, AnswersWithAnyHttpAnswer) {
+TEST(MisbehaviorTest, AnswersWithAnyHttpAnswer) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.httpAnswer = {302, "Found", {{"Location", "https://elsewhere.example/"}}, "gone"};
@@ -85,7 +83,7 @@ TEST(Misbehavior, AnswersWithAnyHttpAnswer) {
   EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
 }
 
-TEST(Misbehavior, SendsRawOctetsBehindARawPrefix) {
+TEST(MisbehaviorTest, SendsRawOctetsBehindARawPrefix) {
   Server server;
   Misbehavior misbehavior = Raw();
   misbehavior.rawPrefix = "HTTP/1.1 100 Continue\r\n\r\n";
@@ -96,7 +94,7 @@ TEST(Misbehavior, SendsRawOctetsBehindARawPrefix) {
             "HTTP/1.1 100 Continue\r\n\r\n" + std::string("NUL\0 and \xFF", 10));
 }
 
-TEST(Misbehavior, EditsTheEnvelope) {
+TEST(MisbehaviorTest, EditsTheEnvelope) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.editEnvelope = [](std::string& envelope) { envelope = "<other/>"; };
@@ -104,7 +102,7 @@ TEST(Misbehavior, EditsTheEnvelope) {
   EXPECT_THAT(Asked(server)->ReadAnswer(), EndsWith("Content-Length: 8\r\n\r\n<other/>"));
 }
 
-TEST(Misbehavior, AHookThatThrowsCostsItsConnection) {
+TEST(MisbehaviorTest, AHookThatThrowsCostsItsConnection) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.editEnvelope = [](std::string&) { throw std::runtime_error("hook"); };
@@ -113,7 +111,7 @@ TEST(Misbehavior, AHookThatThrowsCostsItsConnection) {
   EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
 }
 
-TEST(Misbehavior, IsTakenInTheOrderOfTheCallsAndAsOftenAsAsked) {
+TEST(MisbehaviorTest, IsTakenInTheOrderOfTheCallsAndAsOftenAsAsked) {
   Server server;
   Misbehavior first;
   first.httpAnswer = {201, "First", {}, ""};
@@ -127,7 +125,7 @@ TEST(Misbehavior, IsTakenInTheOrderOfTheCallsAndAsOftenAsAsked) {
   EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 200 OK"));
 }
 
-TEST(Misbehavior, SendsTheBodyInChunks) {
+TEST(MisbehaviorTest, SendsTheBodyInChunks) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.httpAnswer = {200, "OK", {}, "abcdefghijklmnopq"};
@@ -138,7 +136,7 @@ TEST(Misbehavior, SendsTheBodyInChunks) {
             "1\r\na\r\na\r\nbcdefghijk\r\n3\r\nlmn\r\n3\r\nopq\r\n0\r\n\r\n");
 }
 
-TEST(Misbehavior, PadsHeadAndBody) {
+TEST(MisbehaviorTest, PadsHeadAndBody) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.padHeaderBytes = 70'000;
@@ -151,7 +149,7 @@ TEST(Misbehavior, PadsHeadAndBody) {
   EXPECT_EQ(answer.back(), ' ');
 }
 
-TEST(Misbehavior, ClosesWithAndWithoutAWord) {
+TEST(MisbehaviorTest, ClosesWithAndWithoutAWord) {
   Server server;
   Misbehavior announced;
   announced.closeConnection = true;
@@ -171,9 +169,9 @@ struct CutCase {
   Ending tls;
 };
 
-class CutOffBy : public testing::TestWithParam<CutCase> {};
+class CutOffTest : public testing::TestWithParam<CutCase> {};
 
-TEST_P(CutOffBy, EndsAfterTheGivenOctets) {
+TEST_P(CutOffTest, EndsAfterTheGivenOctets) {
   Server server;
   for (const std::size_t octets : {0UL, 1UL, 20UL, sizeof kRaw - 2}) {
     Misbehavior misbehavior = Raw();
@@ -198,7 +196,7 @@ TEST_P(CutOffBy, EndsAfterTheGivenOctets) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryStyle, CutOffBy,
+    EveryStyle, CutOffTest,
     testing::Values(CutCase{"Orderly", CutStyle::Orderly, Ending::Orderly, Ending::Orderly},
                     CutCase{"WithoutNotice", CutStyle::WithoutNotice, Ending::Orderly,
                             Ending::Truncated},
@@ -215,7 +213,7 @@ bool WaitForEnd(const Server& server) {
   });
 }
 
-TEST(Misbehavior, StallsBeforeTheHandshake) {
+TEST(MisbehaviorTest, StallsBeforeTheHandshake) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.stall = Stall::BeforeTlsHandshake;
@@ -229,7 +227,7 @@ TEST(Misbehavior, StallsBeforeTheHandshake) {
   EXPECT_EQ(server.GetCounters().handshakesDone, 0U);
 }
 
-TEST(Misbehavior, StallsBeforeTheRequest) {
+TEST(MisbehaviorTest, StallsBeforeTheRequest) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.stall = Stall::BeforeRequest;
@@ -249,9 +247,9 @@ struct StallCase {
   std::size_t sent;
 };
 
-class StallIn : public testing::TestWithParam<StallCase> {};
+class StallTest : public testing::TestWithParam<StallCase> {};
 
-TEST_P(StallIn, SendsThatMuchAndNoMore) {
+TEST_P(StallTest, SendsThatMuchAndNoMore) {
   Server server;
   Misbehavior misbehavior = Raw();
   misbehavior.stall = GetParam().stall;
@@ -267,14 +265,14 @@ TEST_P(StallIn, SendsThatMuchAndNoMore) {
   EXPECT_TRUE(client->IsSilent(20ms));
 }
 
-INSTANTIATE_TEST_SUITE_P(EveryStage, StallIn,
+INSTANTIATE_TEST_SUITE_P(EveryStage, StallTest,
                          testing::Values(StallCase{"BeforeAnswer", Stall::BeforeAnswer, 0},
                                          StallCase{"AfterHeaders", Stall::AfterHeaders,
                                                    sizeof kRaw - 11},
                                          StallCase{"InMidBody", Stall::InMidBody, sizeof kRaw - 6}),
                          [](const auto& test) { return test.param.name; });
 
-TEST(Misbehavior, AStalledServerStops) {
+TEST(MisbehaviorTest, AStalledServerStops) {
   auto server = std::make_unique<Server>();
   Misbehavior misbehavior;
   misbehavior.stall = Stall::BeforeAnswer;
@@ -285,7 +283,7 @@ TEST(Misbehavior, AStalledServerStops) {
   EXPECT_EQ(client->ReadToEnd(), "");
 }
 
-TEST(Misbehavior, DelaysTheAnswer) {
+TEST(MisbehaviorTest, DelaysTheAnswer) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.delayBeforeAnswer = 50ms;
@@ -295,7 +293,7 @@ TEST(Misbehavior, DelaysTheAnswer) {
   EXPECT_GE(std::chrono::steady_clock::now() - start, 50ms);
 }
 
-TEST(Misbehavior, GivesUpADelayWhenThePeerGoes) {
+TEST(MisbehaviorTest, GivesUpADelayWhenThePeerGoes) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.delayBeforeAnswer = 1h;
@@ -309,7 +307,7 @@ TEST(Misbehavior, GivesUpADelayWhenThePeerGoes) {
   }));
 }
 
-TEST(Misbehavior, DripsTheAnswer) {
+TEST(MisbehaviorTest, DripsTheAnswer) {
   Server server;
   Misbehavior misbehavior = Raw();
   misbehavior.drip = Drip{10, 1ms};
@@ -319,7 +317,7 @@ TEST(Misbehavior, DripsTheAnswer) {
   EXPECT_GE(std::chrono::steady_clock::now() - start, 4ms);
 }
 
-TEST(Server, HoldsAThousandExchangesAtOnce) {
+TEST(ServerTest, HoldsAThousandExchangesAtOnce) {
   constexpr std::size_t kCount = 1000;
   Server server;
   Misbehavior misbehavior = Raw();
@@ -338,4 +336,4 @@ TEST(Server, HoldsAThousandExchangesAtOnce) {
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

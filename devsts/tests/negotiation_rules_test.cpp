@@ -1,5 +1,13 @@
 // What a negotiation's requests must be like, and what the service does wrong when told to.
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
 
 #include "devsts/negotiation.h"
 #include "expect_fault.h"

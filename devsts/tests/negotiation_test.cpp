@@ -2,10 +2,14 @@
 
 #include <gmock/gmock.h>
 #include <gssapi/gssapi_ext.h>
+#include <gtest/gtest.h>
 
 #include <array>
-#include <optional>
+#include <cstddef>
+#include <stdexcept>
+#include <string>
 #include <thread>
+#include <vector>
 
 #include "expect_fault.h"
 #include "negotiation_fixture.h"

@@ -1,9 +1,11 @@
 // What SPNEGO's messages are like that the service reads itself, and that no other does it harm.
-#include "kerberos/spnego_token.h"
-
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
+#include <cstddef>
 #include <functional>
+
+#include "kerberos/spnego_token.h"
 
 namespace DevSts::Testing {
 namespace {

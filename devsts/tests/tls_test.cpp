@@ -1,19 +1,17 @@
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <openssl/x509_vfy.h>
 
 #include <memory>
+#include <string>
 
 #include "devsts/server.h"
 #include "raw_client.h"
 #include "request_text.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
-using Testing::AliceEnvelope;
-using Testing::kIssueAction;
-using Testing::PostOf;
-using Testing::RawClient;
 using testing::StartsWith;
 
 struct CertificateCase {
@@ -23,9 +21,9 @@ struct CertificateCase {
   long verdict;
 };
 
-class ServerCertificateIs : public testing::TestWithParam<CertificateCase> {};
+class ServerCertificateTest : public testing::TestWithParam<CertificateCase> {};
 
-TEST_P(ServerCertificateIs, JudgedSoByOpenSsl) {
+TEST_P(ServerCertificateTest, JudgedSoByOpenSsl) {
   ServerOptions options;
   options.tls.certificate = GetParam().certificate;
   options.tls.dnsNames = {"*.example.com"};
@@ -36,7 +34,7 @@ TEST_P(ServerCertificateIs, JudgedSoByOpenSsl) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryKind, ServerCertificateIs,
+    EveryKind, ServerCertificateTest,
     testing::Values(
         CertificateCase{"ValidByAddress", ServerCertificate::Valid, "127.0.0.1", X509_V_OK},
         CertificateCase{"ValidByName", ServerCertificate::Valid, "localhost", X509_V_OK},
@@ -64,14 +62,14 @@ INSTANTIATE_TEST_SUITE_P(
                         X509_V_ERR_HOSTNAME_MISMATCH}),
     [](const auto& test) { return test.param.name; });
 
-TEST(Tls, OneServersAuthorityIsNotAnothers) {
+TEST(TlsTest, OneServersAuthorityIsNotAnothers) {
   const Server server;
   const Server other;
   RawClient client(server.HttpsPort());
   EXPECT_NE(client.StartTls(other.CaCertificatePem()), X509_V_OK);
 }
 
-TEST(Tls, RefusesModernClientsOverOldProtocols) {
+TEST(TlsTest, RefusesModernClientsOverOldProtocols) {
   for (const TlsProtocol protocol : {TlsProtocol::Tls11Only, TlsProtocol::AnonymousSuites}) {
     ServerOptions options;
     options.tls.protocol = protocol;
@@ -95,7 +93,7 @@ bool CarelessHandshake(const Server& server, int version, const char* ciphers) {
   return BIO_do_handshake(bio.get()) == 1;
 }
 
-TEST(Tls, SpeaksOldProtocolsToCarelessClients) {
+TEST(TlsTest, SpeaksOldProtocolsToCarelessClients) {
   ServerOptions options;
   options.tls.protocol = TlsProtocol::Tls11Only;
   const Server old(options);
@@ -110,7 +108,7 @@ std::string Ask(RawClient& client) {
   return client.ReadAnswer();
 }
 
-TEST(Tls, RequiresAClientCertificate) {
+TEST(TlsTest, RequiresAClientCertificate) {
   ServerOptions options;
   options.tls.requireClientCertificate = true;
   const Server server(options);
@@ -141,7 +139,7 @@ bool ResumesOnSecondConnection(const Server& server) {
   return server.LastRequest().tlsSessionReused;
 }
 
-TEST(Tls, ResumesSessions) {
+TEST(TlsTest, ResumesSessions) {
   for (const TlsProtocol protocol : {TlsProtocol::Modern, TlsProtocol::Tls12Only}) {
     ServerOptions options;
     options.tls.protocol = protocol;
@@ -153,7 +151,7 @@ TEST(Tls, ResumesSessions) {
   }
 }
 
-TEST(Tls, DoesNotResumeWhenToldNotTo) {
+TEST(TlsTest, DoesNotResumeWhenToldNotTo) {
   ServerOptions options;
   options.tls.sessionResumption = false;
   const Server server(options);
@@ -161,4 +159,4 @@ TEST(Tls, DoesNotResumeWhenToldNotTo) {
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing
