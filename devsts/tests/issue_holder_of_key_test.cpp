@@ -1,4 +1,4 @@
-// What the service issues to requests that prove a key.
+// Tokens for requests that prove possession of a key.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -21,7 +21,7 @@ using testing::StartsWith;
 
 constexpr char kHolderOfKey[] = "Method=\"urn:oasis:names:tc:SAML:2.0:cm:holder-of-key\"";
 
-// The certificate's octets as they stand in an assertion.
+// The certificate's octets, encoded as in an assertion.
 std::string Base64Of(std::string pem) {
   pem = pem.substr(pem.find('\n') + 1);
   pem = pem.substr(0, pem.find("-----END"));
@@ -62,7 +62,7 @@ TEST(IssueHolderOfKeyTest, ByPasswordStillNeedsThePassword) {
   EXPECT_EQ(ElementText(answer, "faultstring"), "Invalid credentials");
 }
 
-TEST(IssueHolderOfKeyTest, ByCertificateKnowsTheUserByIt) {
+TEST(IssueHolderOfKeyTest, ByCertificateIdentifiesTheUser) {
   Server server;
   const Credential machine = server.MakeClientCredential("machine");
   server.RegisterCertificate("machine@EXAMPLE.COM", machine.certificatePem);
@@ -73,17 +73,17 @@ TEST(IssueHolderOfKeyTest, ByCertificateKnowsTheUserByIt) {
   ExpectBoundTo(machine, assertion);
 }
 
-TEST(IssueHolderOfKeyTest, ByCertificateRefusesOneThatIsNobodys) {
+TEST(IssueHolderOfKeyTest, ByCertificateRefusesACertificateOfNoUser) {
   Server server;
   server.RegisterCertificate("machine@EXAMPLE.COM", Holder("machine").certificatePem);
   const Credential other = Holder("machine");
   const std::string answer =
       Ask(server, Sign(ByCertificate(other, IssueBody("PublicKey", kUseKey)), other));
   EXPECT_EQ(ElementText(answer, "faultcode"), "wst:FailedAuthentication");
-  EXPECT_EQ(ElementText(answer, "faultstring"), "The certificate is nobody's");
+  EXPECT_EQ(ElementText(answer, "faultstring"), "The certificate belongs to no user");
 }
 
-TEST(IssueHolderOfKeyTest, ByCertificateIsRegisteredForAUserThatThereIs) {
+TEST(IssueHolderOfKeyTest, RegistersCertificatesOnlyForExistingUsers) {
   Server server;
   EXPECT_THROW(server.RegisterCertificate("nobody@EXAMPLE.COM", Holder().certificatePem),
                std::out_of_range);
@@ -95,7 +95,7 @@ TEST(IssueHolderOfKeyTest, WithoutAnyCredentialIsRefused) {
   const std::string answer = Ask(server, Envelope("", IssueBody("Bearer")));
   EXPECT_EQ(ElementText(answer, "faultcode"), "wsse:InvalidSecurity");
   EXPECT_EQ(ElementText(answer, "faultstring"),
-            "No UsernameToken and no Signature behind the Timestamp");
+            "No UsernameToken and no Signature after the Timestamp");
 }
 
 TEST(IssueHolderOfKeyTest, ByTokenIssuesToTheSameSubjectAndKey) {
@@ -109,7 +109,7 @@ TEST(IssueHolderOfKeyTest, ByTokenIssuesToTheSameSubjectAndKey) {
   ExpectBoundTo(holder, second);
 }
 
-TEST(IssueHolderOfKeyTest, ByTokenIssuesABearerTokenIfAskedTo) {
+TEST(IssueHolderOfKeyTest, ByTokenIssuesABearerTokenIfRequested) {
   const Server server;
   const Credential holder = Holder();
   const std::string bearer =
@@ -118,7 +118,7 @@ TEST(IssueHolderOfKeyTest, ByTokenIssuesABearerTokenIfAskedTo) {
   EXPECT_EQ(ElementText(bearer, "saml2:NameID"), "alice@EXAMPLE.COM");
 }
 
-TEST(IssueHolderOfKeyTest, ByTokenHandsOnOneDelegationLessEachTime) {
+TEST(IssueHolderOfKeyTest, ByTokenAllowsOneDelegationLessEachTime) {
   const Server server;
   const Credential holder = Holder();
   const std::string first = HolderToken(server, holder);
@@ -137,7 +137,7 @@ TEST(IssueHolderOfKeyTest, DelegatesToAnotherPrincipal) {
   ExpectBoundTo(holder, assertion);
 }
 
-// alice to machine to bob: the chain stands in its order and the confirmation names its end.
+// alice to machine to bob: the chain is in order, and the confirmation names the last delegate.
 TEST(IssueHolderOfKeyTest, ByTokenWithActAsAddsTheRequesterToTheChain) {
   Server server;
   const Credential machine = server.MakeClientCredential("machine");
@@ -177,7 +177,7 @@ TEST(IssueHolderOfKeyTest, ADelegateUsesItsTokenWithoutGrowingTheChain) {
   EXPECT_EQ(assertion.find("<del:Delegate ", only + 1), std::string::npos);
 }
 
-TEST(IssueHolderOfKeyTest, NothingDelegableComesOfATokenThatIsNot) {
+TEST(IssueHolderOfKeyTest, ByTokenRefusesToDelegateATokenThatIsNotDelegable) {
   const Server server;
   const Credential holder = Holder();
   const auto notDelegable = [](std::string body) {
@@ -190,14 +190,14 @@ TEST(IssueHolderOfKeyTest, NothingDelegableComesOfATokenThatIsNot) {
   EXPECT_THAT(AskByToken(server, token, notDelegable(IssueBody("PublicKey")), holder),
               StartsWith("HTTP/1.1 200"));
   EXPECT_EQ(ElementText(AskByToken(server, token, IssueBody("PublicKey"), holder), "faultstring"),
-            "What is based on a token that is not delegable cannot be delegable");
+            "A token that is based on one that is not delegable cannot be delegable");
   const std::string delegates = notDelegable(IssueBody("PublicKey", DelegateTo("bob@EXAMPLE.COM")));
   EXPECT_EQ(ElementText(AskByToken(server, token, delegates, holder), "faultstring"),
-            "What is based on a token that is not delegable cannot be delegated to "
+            "A token that is based on one that is not delegable cannot be delegated to "
             "bob@EXAMPLE.COM");
 }
 
-TEST(IssueHolderOfKeyTest, ByTokenRefusesATokenThatIsNotGood) {
+TEST(IssueHolderOfKeyTest, ByTokenRefusesAnInvalidToken) {
   ServerOptions options;
   options.issuedTokenLimit = 1;
   Server server(options);
@@ -222,7 +222,7 @@ TEST(IssueHolderOfKeyTest, ByTokenRefusesATokenThatIsNotGood) {
   EXPECT_FALSE(server.Revoke(IdOfAssertion(token)));
 }
 
-TEST(IssueHolderOfKeyTest, RefusesAnActAsTokenThatWasRevoked) {
+TEST(IssueHolderOfKeyTest, RefusesARevokedActAsToken) {
   Server server;
   const std::string alices = AssertionIn(Ask(server, AliceEnvelope()));
   server.Revoke(IdOfAssertion(alices));

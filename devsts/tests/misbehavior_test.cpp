@@ -32,14 +32,14 @@ Misbehavior Raw() {
   return misbehavior;
 }
 
-// A client that has sent a request.
-std::unique_ptr<RawClient> Asked(const Server& server) {
+// Sends a request and returns its client.
+std::unique_ptr<RawClient> SendRequest(const Server& server) {
   auto client = std::make_unique<RawClient>(server.HttpPort());
   client->Send(PostOf(AliceEnvelope(), kIssueAction));
   return client;
 }
 
-std::unique_ptr<RawClient> AskedOverTls(const Server& server) {
+std::unique_ptr<RawClient> SendRequestOverTls(const Server& server) {
   auto client = std::make_unique<RawClient>(server.HttpsPort());
   EXPECT_EQ(client->StartTls(server.CaCertificatePem()), X509_V_OK);
   client->Send(PostOf(AliceEnvelope(), kIssueAction));
@@ -51,19 +51,19 @@ TEST(MisbehaviorTest, AnswersWithAnyFault) {
   Misbehavior misbehavior;
   misbehavior.fault = {"urn:any", "Code", "<why>", false, 500};
   server.MisbehaveNext(misbehavior);
-  const std::string answer = Asked(server)->ReadAnswer();
+  const std::string answer = SendRequest(server)->ReadAnswer();
   EXPECT_THAT(answer, StartsWith("HTTP/1.1 500 "));
   EXPECT_THAT(answer, HasSubstr("<faultcode xmlns:code=\"urn:any\">code:Code</faultcode>"));
   EXPECT_EQ(ElementText(answer, "faultstring"), "&lt;why&gt;");
-  EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
 }
 
-TEST(MisbehaviorTest, LeavesPrefixAndFaultStringOut) {
+TEST(MisbehaviorTest, OmitsPrefixAndFaultString) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.fault = {"", "FailedAuthentication", "", true, 200};
   server.SetMisbehavior(misbehavior);
-  const std::string answer = Asked(server)->ReadAnswer();
+  const std::string answer = SendRequest(server)->ReadAnswer();
   EXPECT_THAT(answer, StartsWith("HTTP/1.1 200 "));
   EXPECT_THAT(answer, HasSubstr("<faultcode>FailedAuthentication</faultcode></soapenv:Fault>"));
 }
@@ -75,22 +75,22 @@ TEST(MisbehaviorTest, AnswersWithAnyHttpAnswer) {
   misbehavior.setCookies = {"a=1; Path=/", "b=2"};
   misbehavior.extraHeaders = {{"X-Extra", "yes"}};
   server.SetMisbehavior(misbehavior);
-  EXPECT_EQ(Asked(server)->ReadAnswer(),
+  EXPECT_EQ(SendRequest(server)->ReadAnswer(),
             "HTTP/1.1 302 Found\r\nLocation: https://elsewhere.example/\r\n"
             "Set-Cookie: a=1; Path=/\r\nSet-Cookie: b=2\r\nX-Extra: yes\r\n"
             "Content-Length: 4\r\n\r\ngone");
   server.ClearMisbehavior();
-  EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
 }
 
-TEST(MisbehaviorTest, SendsRawOctetsBehindARawPrefix) {
+TEST(MisbehaviorTest, SendsRawOctetsAfterARawPrefix) {
   Server server;
   Misbehavior misbehavior = Raw();
   misbehavior.rawPrefix = "HTTP/1.1 100 Continue\r\n\r\n";
   misbehavior.rawAnswer = std::string("NUL\0 and \xFF", 10);
   misbehavior.closeConnection = true;
   server.MisbehaveNext(misbehavior);
-  EXPECT_EQ(Asked(server)->ReadToEnd(),
+  EXPECT_EQ(SendRequest(server)->ReadToEnd(),
             "HTTP/1.1 100 Continue\r\n\r\n" + std::string("NUL\0 and \xFF", 10));
 }
 
@@ -99,19 +99,19 @@ TEST(MisbehaviorTest, EditsTheEnvelope) {
   Misbehavior misbehavior;
   misbehavior.editEnvelope = [](std::string& envelope) { envelope = "<other/>"; };
   server.MisbehaveNext(misbehavior);
-  EXPECT_THAT(Asked(server)->ReadAnswer(), EndsWith("Content-Length: 8\r\n\r\n<other/>"));
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), EndsWith("Content-Length: 8\r\n\r\n<other/>"));
 }
 
-TEST(MisbehaviorTest, AHookThatThrowsCostsItsConnection) {
+TEST(MisbehaviorTest, AHookThatThrowsEndsItsConnection) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.editEnvelope = [](std::string&) { throw std::runtime_error("hook"); };
   server.MisbehaveNext(misbehavior);
-  EXPECT_EQ(Asked(server)->ReadToEnd(), "");
-  EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
+  EXPECT_EQ(SendRequest(server)->ReadToEnd(), "");
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
 }
 
-TEST(MisbehaviorTest, IsTakenInTheOrderOfTheCallsAndAsOftenAsAsked) {
+TEST(MisbehaviorTest, AppliesInTheOrderOfTheCallsAndAsOftenAsRequested) {
   Server server;
   Misbehavior first;
   first.httpAnswer = {201, "First", {}, ""};
@@ -119,10 +119,10 @@ TEST(MisbehaviorTest, IsTakenInTheOrderOfTheCallsAndAsOftenAsAsked) {
   second.httpAnswer = {202, "Second", {}, ""};
   server.MisbehaveNext(first, 2);
   server.MisbehaveNext(second);
-  EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 201 First"));
-  EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 201 First"));
-  EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 202 Second"));
-  EXPECT_THAT(Asked(server)->ReadAnswer(), HasSubstr(" 200 OK"));
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), HasSubstr(" 201 First"));
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), HasSubstr(" 201 First"));
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), HasSubstr(" 202 Second"));
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), HasSubstr(" 200 OK"));
 }
 
 TEST(MisbehaviorTest, SendsTheBodyInChunks) {
@@ -131,7 +131,7 @@ TEST(MisbehaviorTest, SendsTheBodyInChunks) {
   misbehavior.httpAnswer = {200, "OK", {}, "abcdefghijklmnopq"};
   misbehavior.chunkSizes = {1, 10, 3};
   server.MisbehaveNext(misbehavior);
-  EXPECT_EQ(Asked(server)->ReadAnswer(),
+  EXPECT_EQ(SendRequest(server)->ReadAnswer(),
             "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n"
             "1\r\na\r\na\r\nbcdefghijk\r\n3\r\nlmn\r\n3\r\nopq\r\n0\r\n\r\n");
 }
@@ -142,23 +142,23 @@ TEST(MisbehaviorTest, PadsHeadAndBody) {
   misbehavior.padHeaderBytes = 70'000;
   misbehavior.padBodyBytes = 100'000;
   server.MisbehaveNext(misbehavior);
-  const std::string answer = Asked(server)->ReadAnswer();
+  const std::string answer = SendRequest(server)->ReadAnswer();
   const std::size_t head = answer.find("\r\n\r\n");
   EXPECT_GT(head, 70'000U);
   EXPECT_GT(answer.size() - head, 100'000U);
   EXPECT_EQ(answer.back(), ' ');
 }
 
-TEST(MisbehaviorTest, ClosesWithAndWithoutAWord) {
+TEST(MisbehaviorTest, ClosesWithAndWithoutAnnouncement) {
   Server server;
   Misbehavior announced;
   announced.closeConnection = true;
   server.MisbehaveNext(announced);
-  EXPECT_THAT(Asked(server)->ReadToEnd(), HasSubstr("Connection: close\r\n"));
+  EXPECT_THAT(SendRequest(server)->ReadToEnd(), HasSubstr("Connection: close\r\n"));
   Misbehavior silent;
   silent.closeUnannounced = true;
   server.MisbehaveNext(silent);
-  EXPECT_THAT(Asked(server)->ReadToEnd(),
+  EXPECT_THAT(SendRequest(server)->ReadToEnd(),
               AllOf(StartsWith("HTTP/1.1 200 "), Not(HasSubstr("Connection: close"))));
 }
 
@@ -179,11 +179,11 @@ TEST_P(CutOffTest, EndsAfterTheGivenOctets) {
     server.MisbehaveNext(misbehavior, 2);
     const std::string expected(kRaw, octets);
 
-    const auto plain = Asked(server);
+    const auto plain = SendRequest(server);
     const std::string plainOctets = plain->ReadToEnd();
     EXPECT_EQ(plain->HowItEnded(), GetParam().plain) << octets;
 
-    const auto tls = AskedOverTls(server);
+    const auto tls = SendRequestOverTls(server);
     const std::string tlsOctets = tls->ReadToEnd();
     EXPECT_EQ(tls->HowItEnded(), GetParam().tls) << octets;
 
@@ -233,7 +233,7 @@ TEST(MisbehaviorTest, StallsBeforeTheRequest) {
   misbehavior.stall = Stall::BeforeRequest;
   server.MisbehaveNext(misbehavior);
   {
-    const auto client = AskedOverTls(server);
+    const auto client = SendRequestOverTls(server);
     ASSERT_TRUE(WaitForStall(server));
   }
   EXPECT_TRUE(WaitForEnd(server));
@@ -249,19 +249,19 @@ struct StallCase {
 
 class StallTest : public testing::TestWithParam<StallCase> {};
 
-TEST_P(StallTest, SendsThatMuchAndNoMore) {
+TEST_P(StallTest, SendsOnlyWhatPrecedesTheStall) {
   Server server;
   Misbehavior misbehavior = Raw();
   misbehavior.stall = GetParam().stall;
   server.MisbehaveNext(misbehavior);
-  const auto client = Asked(server);
+  const auto client = SendRequest(server);
   ASSERT_TRUE(WaitForStall(server));
   EXPECT_EQ(server.GetCounters().requests, 1U);
-  std::string got;
-  while (got.size() < GetParam().sent) {
-    ASSERT_TRUE(client->ReadSome(got));
+  std::string received;
+  while (received.size() < GetParam().sent) {
+    ASSERT_TRUE(client->ReadSome(received));
   }
-  EXPECT_EQ(got, std::string(kRaw, GetParam().sent));
+  EXPECT_EQ(received, std::string(kRaw, GetParam().sent));
   EXPECT_TRUE(client->IsSilent(20ms));
 }
 
@@ -277,7 +277,7 @@ TEST(MisbehaviorTest, AStalledServerStops) {
   Misbehavior misbehavior;
   misbehavior.stall = Stall::BeforeAnswer;
   server->SetMisbehavior(misbehavior);
-  const auto client = Asked(*server);
+  const auto client = SendRequest(*server);
   ASSERT_TRUE(WaitForStall(*server));
   server.reset();
   EXPECT_EQ(client->ReadToEnd(), "");
@@ -289,17 +289,17 @@ TEST(MisbehaviorTest, DelaysTheAnswer) {
   misbehavior.delayBeforeAnswer = 50ms;
   server.MisbehaveNext(misbehavior);
   const auto start = std::chrono::steady_clock::now();
-  EXPECT_THAT(Asked(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
+  EXPECT_THAT(SendRequest(server)->ReadAnswer(), StartsWith("HTTP/1.1 200 "));
   EXPECT_GE(std::chrono::steady_clock::now() - start, 50ms);
 }
 
-TEST(MisbehaviorTest, GivesUpADelayWhenThePeerGoes) {
+TEST(MisbehaviorTest, EndsADelayWhenThePeerDisconnects) {
   Server server;
   Misbehavior misbehavior;
   misbehavior.delayBeforeAnswer = 1h;
   server.MisbehaveNext(misbehavior);
   {
-    const auto client = Asked(server);
+    const auto client = SendRequest(server);
     ASSERT_TRUE(server.WaitUntil([](const Counters& counters) { return counters.delayed == 1; }));
   }
   EXPECT_TRUE(server.WaitUntil([](const Counters& counters) {
@@ -313,7 +313,7 @@ TEST(MisbehaviorTest, DripsTheAnswer) {
   misbehavior.drip = Drip{10, 1ms};
   server.MisbehaveNext(misbehavior);
   const auto start = std::chrono::steady_clock::now();
-  EXPECT_EQ(Asked(server)->ReadAnswer(), kRaw);
+  EXPECT_EQ(SendRequest(server)->ReadAnswer(), kRaw);
   EXPECT_GE(std::chrono::steady_clock::now() - start, 4ms);
 }
 
@@ -325,7 +325,7 @@ TEST(ServerTest, HoldsAThousandExchangesAtOnce) {
   server.SetMisbehavior(misbehavior);
   std::vector<std::unique_ptr<RawClient>> clients;
   for (std::size_t i = 0; i < kCount; ++i) {
-    clients.push_back(Asked(server));
+    clients.push_back(SendRequest(server));
   }
   EXPECT_TRUE(
       server.WaitUntil([](const Counters& counters) { return counters.delayed == kCount; }, 60s));

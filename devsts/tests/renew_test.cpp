@@ -23,7 +23,7 @@ std::string AskToRenew(const Server& server, const std::string& token, const Cre
   return Ask(server, Sign(ByCertificate(holder, RenewBody(token)), holder, edits), kRenewAction);
 }
 
-// Puts the token's whole validity at another time, in seconds from now.
+// Sets the token's validity period, in seconds from now.
 AssertionOptions ValidFrom(long start, long end) {
   AssertionOptions options;
   options.beforeSigning = [=](std::string& text) {
@@ -36,7 +36,7 @@ AssertionOptions ValidFrom(long start, long end) {
   return options;
 }
 
-TEST(RenewTest, GivesANewTokenOfTheSameSubjectKeyAndContent) {
+TEST(RenewTest, IssuesANewTokenWithTheSameSubjectKeyAndContent) {
   const Server server;
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
@@ -47,8 +47,8 @@ TEST(RenewTest, GivesANewTokenOfTheSameSubjectKeyAndContent) {
   EXPECT_NE(IdOfAssertion(renewed), IdOfAssertion(token));
   for (const char* element : {"saml2:NameID", "ds:KeyInfo", "saml2:AttributeStatement"}) {
     const auto part = [&](const std::string& text) {
-      const std::string behind = text.substr(text.find("<saml2:Subject>"));
-      return ElementText(behind, element);
+      const std::string rest = text.substr(text.find("<saml2:Subject>"));
+      return ElementText(rest, element);
     };
     EXPECT_EQ(part(renewed), part(token)) << element;
     EXPECT_NE(part(renewed), "") << element;
@@ -56,17 +56,17 @@ TEST(RenewTest, GivesANewTokenOfTheSameSubjectKeyAndContent) {
   EXPECT_TRUE(VerifyXml(renewed, server.SigningCertificatePem()));
 }
 
-TEST(RenewTest, GrantsTheLifetimeThatIsAskedFor) {
+TEST(RenewTest, GrantsTheRequestedLifetime) {
   const Server server;
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
   const std::string answer = AskToRenew(server, token, holder);
-  // Two hours, where the token had one: only then is it beyond this.
+  // Two hours are requested; the token had one.
   EXPECT_GT(ElementText(answer, "wsu:Expires"), TimeFromNow(7000));
   EXPECT_LT(ElementText(answer, "wsu:Expires"), TimeFromNow(7300));
 }
 
-TEST(RenewTest, CountsDownToNoMore) {
+TEST(RenewTest, CountsDownToZero) {
   ServerOptions options;
   options.assertion.renewCount = 2;
   const Server server(options);
@@ -101,7 +101,7 @@ TEST(RenewTest, RefusesABearerToken) {
 TEST(RenewTest, RefusesAnotherKeyThanTheTokens) {
   const Server server;
   const std::string token = HolderToken(server, Holder());
-  ExpectFault(AskToRenew(server, token, Holder("somebody else")), "wst:FailedAuthentication",
+  ExpectFault(AskToRenew(server, token, Holder("another holder")), "wst:FailedAuthentication",
               "The request is not signed by the key of the RenewTarget");
 }
 

@@ -1,4 +1,4 @@
-// The signatures of requests as a whole: what they prove, and when.
+// The signatures of requests as a whole: what they prove, and when they are required.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -17,27 +17,27 @@ namespace {
 
 using testing::StartsWith;
 
-const Credential& Alices() {
+const Credential& AliceCredential() {
   static const Credential holder = Holder();
   return holder;
 }
 
-ProofRequest AlicesRequest() {
-  return ByCertificate(Alices(), IssueBody("PublicKey", kUseKey),
+ProofRequest AliceRequest() {
+  return ByCertificate(AliceCredential(), IssueBody("PublicKey", kUseKey),
                        UsernameToken("alice@EXAMPLE.COM", "secret"));
 }
 
 TEST(RequestSignatureTest, OfTheCertificateFormIsAccepted) {
   const Server server;
-  EXPECT_THAT(Ask(server, Sign(AlicesRequest(), Alices())), StartsWith("HTTP/1.1 200"));
+  EXPECT_THAT(Ask(server, Sign(AliceRequest(), AliceCredential())), StartsWith("HTTP/1.1 200"));
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByCertificate);
 }
 
-TEST(RequestSignatureTest, IsSeenOfARefusedRequestToo) {
+TEST(RequestSignatureTest, IsReportedForARefusedRequestToo) {
   const Server server;
-  Ask(server, Sign(AlicesRequest(), Alices(), {{kUseKey, ""}}));
+  Ask(server, Sign(AliceRequest(), AliceCredential(), {{kUseKey, ""}}));
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByCertificate);
-  Ask(server, Sign(AlicesRequest(), Alices(), {{"<wsse:Reference ", "<wsse:Embedded "}}));
+  Ask(server, Sign(AliceRequest(), AliceCredential(), {{"<wsse:Reference ", "<wsse:Embedded "}}));
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::Other);
   Ask(server, AliceEnvelope());
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::None);
@@ -54,7 +54,8 @@ class TamperedRequestTest : public testing::TestWithParam<TamperCase> {};
 TEST_P(TamperedRequestTest, FailsTheCheck) {
   const Server server;
   const TamperCase& test = GetParam();
-  const std::string envelope = Replaced(Sign(AlicesRequest(), Alices()), test.from, test.to);
+  const std::string envelope =
+      Replaced(Sign(AliceRequest(), AliceCredential()), test.from, test.to);
   ExpectFault(Ask(server, envelope), "wsse:FailedCheck",
               "The request's signature does not verify: ");
 }
@@ -69,7 +70,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST(RequestSignatureTest, MustBeByTheCertificatesKey) {
   const Server server;
-  ExpectFault(Ask(server, Sign(AlicesRequest(), Holder("somebody else"))), "wsse:FailedCheck",
+  ExpectFault(Ask(server, Sign(AliceRequest(), Holder("another holder"))), "wsse:FailedCheck",
               "The request's signature does not verify: ");
 }
 
@@ -77,7 +78,8 @@ TEST(RequestSignatureTest, MayBeInAnIndentedHeader) {
   const Server server;
   const Edits blanks = {{"<wsse:BinarySecurityToken", "\n  <wsse:BinarySecurityToken"},
                         {"<ds:SignedInfo>", "\n<ds:SignedInfo>\n"}};
-  EXPECT_THAT(Ask(server, Sign(AlicesRequest(), Alices(), blanks)), StartsWith("HTTP/1.1 200"));
+  EXPECT_THAT(Ask(server, Sign(AliceRequest(), AliceCredential(), blanks)),
+              StartsWith("HTTP/1.1 200"));
 }
 
 TEST(RequestSignatureTest, OfAWeakOrOtherKeyIsRefused) {
@@ -93,7 +95,7 @@ TEST(RequestSignatureTest, OfAWeakOrOtherKeyIsRefused) {
   }
 }
 
-TEST(RequestSignatureTest, ByACertificateOutOfItsTimeIsRefused) {
+TEST(RequestSignatureTest, ByACertificateOutsideItsValidityIsRefused) {
   const Server server;
   for (const long start : {-7200L, 3600L}) {
     CertificateSpec spec;
@@ -125,7 +127,7 @@ TEST_P(SignedTimestampTest, IsRefused) {
     return "<wsu:Created>" + TimeFromNow(created) + "</wsu:Created><wsu:Expires>" +
            TimeFromNow(expires) + "</wsu:Expires></wsu:Timestamp>";
   };
-  std::string envelope = Sign(AlicesRequest(), Alices());
+  std::string envelope = Sign(AliceRequest(), AliceCredential());
   const std::size_t from = envelope.find("<wsu:Created>");
   const std::size_t end = envelope.find("</wsu:Timestamp>") + std::strlen("</wsu:Timestamp>");
   envelope.replace(from, end - from, times(test.created, test.expires));
@@ -143,9 +145,9 @@ INSTANTIATE_TEST_SUITE_P(
                  "The signed Timestamp is not valid for ten minutes"}),
     [](const auto& test) { return test.param.name; });
 
-TEST(RequestSignatureTest, IsMissedWhereItsPartsAre) {
+TEST(RequestSignatureTest, IsRequiredIfItsPartsArePresent) {
   const Server server;
-  const ProofRequest request = AlicesRequest();
+  const ProofRequest request = AliceRequest();
   ExpectFault(Ask(server, Envelope(request.tokens, request.body)), "wsse:InvalidSecurity",
               "A token that names a key needs a signature by that key");
   const std::string wsuId =
@@ -155,7 +157,7 @@ TEST(RequestSignatureTest, IsMissedWhereItsPartsAre) {
               "wst:InvalidRequest", "Unexpected attribute Id on Body");
 }
 
-// The subject could have anybody's key bound to somebody's token.
+// Otherwise a requester could have a key bound to another subject's token without possessing it.
 TEST(RequestSignatureTest, IsNeededForAHolderOfKeyTokenByPasswordWithActAs) {
   const Server server;
   const std::string user = UsernameToken("bob@EXAMPLE.COM", "bob-secret");
@@ -163,37 +165,38 @@ TEST(RequestSignatureTest, IsNeededForAHolderOfKeyTokenByPasswordWithActAs) {
   ExpectFault(Ask(server, Envelope(user, IssueBody("PublicKey", ActAs(alices) + kUseKey))),
               "wst:InvalidRequest", "PublicKey tokens are not issued to unsigned requests");
   ExpectFault(Ask(server, Envelope(user, IssueBody("Bearer", kUseKey))), "wst:InvalidRequest",
-              "UseKey names a signature that is not there");
+              "UseKey names a signature that does not exist");
 }
 
 TEST(RequestSignatureTest, OfTheTokenFormIsAccepted) {
   const Server server;
-  const std::string token = HolderToken(server, Alices());
-  EXPECT_THAT(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), Alices())),
+  const std::string token = HolderToken(server, AliceCredential());
+  EXPECT_THAT(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), AliceCredential())),
               StartsWith("HTTP/1.1 200"));
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByToken);
 }
 
 TEST(RequestSignatureTest, OfTheTokenFormMustBeByTheTokensKey) {
   const Server server;
-  const std::string token = HolderToken(server, Alices());
-  ExpectFault(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), Holder("somebody else"))),
+  const std::string token = HolderToken(server, AliceCredential());
+  ExpectFault(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), Holder("another holder"))),
               "wsse:FailedCheck", "The request's signature does not verify: ");
 }
 
 TEST(RequestSignatureTest, OfTheTokenFormNeedsAHolderOfKeyToken) {
   const Server server;
   const std::string bearer = AssertionIn(Ask(server, AliceEnvelope()));
-  ExpectFault(Ask(server, Sign(ByToken(bearer, IssueBody("PublicKey")), Alices())),
+  ExpectFault(Ask(server, Sign(ByToken(bearer, IssueBody("PublicKey")), AliceCredential())),
               "wsse:InvalidSecurityToken", "The presented token is not a holder-of-key token");
 }
 
-TEST(RequestSignatureTest, OfTheCertificateFormHasNoAssertionBeside) {
+TEST(RequestSignatureTest, OfTheCertificateFormRefusesAnAssertion) {
   const Server server;
-  const std::string token = HolderToken(server, Alices());
-  const ProofRequest request = ByCertificate(Alices(), IssueBody("PublicKey", kUseKey), token);
-  ExpectFault(Ask(server, Sign(request, Alices())), "wsse:InvalidSecurity",
-              "An assertion is not expected beside a BinarySecurityToken");
+  const std::string token = HolderToken(server, AliceCredential());
+  const ProofRequest request =
+      ByCertificate(AliceCredential(), IssueBody("PublicKey", kUseKey), token);
+  ExpectFault(Ask(server, Sign(request, AliceCredential())), "wsse:InvalidSecurity",
+              "An assertion is not expected together with a BinarySecurityToken");
 }
 
 }  // namespace

@@ -32,7 +32,7 @@ std::string AskFor(const Server& server, const std::string& envelope) {
   return Ask(server, PostOf(envelope, kIssueAction));
 }
 
-TEST(ServerTest, IssuesAnAssertionThatVerifiesInItsPlace) {
+TEST(ServerTest, IssuesAnAssertionThatVerifiesInTheEnvelope) {
   const Server server;
   const std::string answer = AskFor(server, AliceEnvelope());
   ASSERT_THAT(answer, StartsWith("HTTP/1.1 200 OK\r\n"));
@@ -44,7 +44,7 @@ TEST(ServerTest, IssuesAnAssertionThatVerifiesInItsPlace) {
   EXPECT_TRUE(VerifyXml(AssertionIn(answer), server.SigningCertificatePem()));
 }
 
-TEST(ServerTest, LaysTheAnswerOutAsTheProtocolSays) {
+TEST(ServerTest, LaysOutTheAnswerAsTheProtocolRequires) {
   const Server server;
   const std::string answer = AskFor(server, AliceEnvelope());
   EXPECT_EQ(ElementText(answer, "wst:TokenType"), "urn:oasis:names:tc:SAML:2.0:assertion");
@@ -84,7 +84,7 @@ TEST(ServerTest, PutsTheUserIntoTheAssertion) {
   EXPECT_THAT(machine, AllOf(HasSubstr(">true<"), Not(HasSubstr("givenname"))));
 }
 
-TEST(ServerTest, GrantsWhatWasAskedFor) {
+TEST(ServerTest, GrantsWhatIsRequested) {
   const Server server;
   const std::string more =
       "<wst:DelegateTo><wsse:UsernameToken xmlns:wsse=\"http://docs.oasis-open.org/wss/2004/01/"
@@ -112,7 +112,7 @@ TEST(ServerTest, GrantsWhatWasAskedFor) {
   EXPECT_TRUE(VerifyXml(assertion, server.SigningCertificatePem()));
 }
 
-TEST(ServerTest, GrantsNoMoreThanWasAskedFor) {
+TEST(ServerTest, GrantsNoMoreThanIsRequested) {
   const Server server;
   std::string envelope = Replaced(AliceEnvelope(), "Allow=\"true\"", "Allow=\"false\"");
   envelope = Replaced(envelope, ">true</wst:Delegatable>", ">false</wst:Delegatable>");
@@ -133,7 +133,7 @@ TEST(ServerTest, ActsAsTheSubjectOfADelegableToken) {
   EXPECT_THAT(ElementText(bobs, "del:Delegate"), HasSubstr(">bob@EXAMPLE.COM</saml2:NameID>"));
 }
 
-TEST(ServerTest, RefusesAnActAsTokenThatWasTamperedWith) {
+TEST(ServerTest, RefusesATamperedActAsToken) {
   const Server server;
   const std::string alices = AssertionIn(AskFor(server, AliceEnvelope()));
   const std::string forged = Replaced(alices, "alice@EXAMPLE.COM", "carol@EXAMPLE.COM");
@@ -161,7 +161,7 @@ struct ShapeCase {
 
 class AssertionShapeTest : public testing::TestWithParam<ShapeCase> {};
 
-TEST_P(AssertionShapeTest, HoldsInTheEnvelope) {
+TEST_P(AssertionShapeTest, VerifiesInTheEnvelope) {
   ServerOptions options;
   options.assertion = GetParam().options;
   const Server server(options);
@@ -195,7 +195,7 @@ INSTANTIATE_TEST_SUITE_P(
         ShapeCase{"NoKeyInfo", With([](auto& o) { o.signing.keyInfo = KeyInfoContent::None; })}),
     [](const auto& test) { return test.param.name; });
 
-TEST(ServerTest, SignsWhatTheFirstHookMadeAndBreaksWithTheSecond) {
+TEST(ServerTest, SignsAfterTheFirstHookAndBeforeTheSecond) {
   Server server;
   AssertionOptions options;
   options.beforeSigning = [](std::string& text) { text = Replaced(text, "Alice", "Alicia"); };
@@ -220,7 +220,7 @@ TEST(ServerTest, RefusesBadCredentials) {
   }
 }
 
-TEST(ServerTest, TellsThatThePasswordHasExpired) {
+TEST(ServerTest, ReportsAnExpiredPassword) {
   const Server server;
   const std::string answer = AskFor(server, IssueEnvelope("expired@EXAMPLE.COM", "expired-secret"));
   EXPECT_EQ(ElementText(answer, "faultcode"), "wst:FailedAuthentication");
@@ -368,7 +368,7 @@ TEST(ServerTest, KeepsALogOfRequests) {
   EXPECT_THAT(server.Requests(), IsEmpty());
 }
 
-TEST(ServerTest, CountsWhatIsNotHttp) {
+TEST(ServerTest, CountsInputThatIsNotHttp) {
   const Server server;
   RawClient client(server.HttpPort());
   client.Send("hello\r\n\r\n");

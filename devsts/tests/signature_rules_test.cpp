@@ -1,4 +1,4 @@
-// What the service refuses of a request's signature, one rule at a time.
+// The rules for a request's signature, each broken on its own.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -15,13 +15,13 @@ namespace {
 constexpr char kExclusive[] = "Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"";
 constexpr char kInclusive[] = "Algorithm=\"http://www.w3.org/TR/2001/REC-xml-c14n-20010315\"";
 
-const Credential& Alices() {
+const Credential& AliceCredential() {
   static const Credential holder = Holder();
   return holder;
 }
 
-ProofRequest AlicesRequest() {
-  return ByCertificate(Alices(), IssueBody("PublicKey", kUseKey),
+ProofRequest AliceRequest() {
+  return ByCertificate(AliceCredential(), IssueBody("PublicKey", kUseKey),
                        UsernameToken("alice@EXAMPLE.COM", "secret"));
 }
 
@@ -41,7 +41,8 @@ class CertificateFormTest : public testing::TestWithParam<RuleCase> {};
 TEST_P(CertificateFormTest, RefusesWhatBreaksOneRule) {
   const Server server;
   const RuleCase& rule = GetParam();
-  ExpectFault(Ask(server, Sign(AlicesRequest(), Alices(), rule.edits)), rule.code, rule.reason);
+  ExpectFault(Ask(server, Sign(AliceRequest(), AliceCredential(), rule.edits)), rule.code,
+              rule.reason);
 }
 
 std::string Algorithm(const char* uri) {
@@ -191,11 +192,11 @@ INSTANTIATE_TEST_SUITE_P(
         RuleCase{"NoCertificate",
                  {{">MII", ">NII"}},
                  "wsse:InvalidSecurityToken",
-                 "The BinarySecurityToken holds no certificate: "},
-        RuleCase{"OctetsBehindTheCertificate",
+                 "The BinarySecurityToken contains no certificate: "},
+        RuleCase{"OctetsAfterTheCertificate",
                  {{"</wsse:BinarySecurityToken>", "AAAA</wsse:BinarySecurityToken>"}},
                  "wsse:InvalidSecurityToken",
-                 "The BinarySecurityToken holds no certificate: "},
+                 "The BinarySecurityToken contains no certificate: "},
         RuleCase{"NoBinarySecurityToken",
                  {{"<wsse:BinarySecurityToken ", "<!--"}, {"</wsse:BinarySecurityToken>", "-->"}},
                  "wsse:InvalidSecurity",
@@ -222,10 +223,10 @@ INSTANTIATE_TEST_SUITE_P(
                              {{"Sig=\"holderOfKeyProofSignature\"", "Sig=\"other\""}},
                              "wst:InvalidRequest",
                              "UseKey/@Sig does not name the request's signature: other"},
-                    RuleCase{"BesideDelegateTo",
+                    RuleCase{"WithDelegateTo",
                              {{kUseKey, DelegateTo("bob@EXAMPLE.COM") + kUseKey}},
                              "wst:InvalidRequest",
-                             "UseKey is not expected beside DelegateTo"},
+                             "UseKey is not expected together with DelegateTo"},
                     RuleCase{"ForABearerToken",
                              {{"/PublicKey<", "/Bearer<"}},
                              "wst:InvalidRequest",
@@ -236,10 +237,10 @@ class TokenFormTest : public testing::TestWithParam<RuleCase> {};
 
 TEST_P(TokenFormTest, RefusesWhatBreaksOneRule) {
   const Server server;
-  const std::string token = HolderToken(server, Alices());
+  const std::string token = HolderToken(server, AliceCredential());
   const ProofRequest request = ByToken(token, IssueBody("PublicKey"));
   const RuleCase& rule = GetParam();
-  ExpectFault(Ask(server, Sign(request, Alices(), rule.edits)), rule.code, rule.reason);
+  ExpectFault(Ask(server, Sign(request, AliceCredential(), rule.edits)), rule.code, rule.reason);
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -263,7 +264,7 @@ INSTANTIATE_TEST_SUITE_P(
                  {{"</wsse:KeyIdentifier>", "0</wsse:KeyIdentifier>"}},
                  "wsse:InvalidSecurity",
                  "The KeyIdentifier names no assertion of the header: _"},
-        RuleCase{"UsernameTokenBeside",
+        RuleCase{"WithUsernameToken",
                  {{"<saml2:Assertion", UsernameToken("bob@EXAMPLE.COM", "x") + "<saml2:Assertion"}},
                  "wsse:InvalidSecurity",
                  "An assertion that proves the key must be the only token"},

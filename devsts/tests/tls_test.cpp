@@ -23,7 +23,7 @@ struct CertificateCase {
 
 class ServerCertificateTest : public testing::TestWithParam<CertificateCase> {};
 
-TEST_P(ServerCertificateTest, JudgedSoByOpenSsl) {
+TEST_P(ServerCertificateTest, HasTheExpectedOpenSslResult) {
   ServerOptions options;
   options.tls.certificate = GetParam().certificate;
   options.tls.dnsNames = {"*.example.com"};
@@ -56,13 +56,13 @@ INSTANTIATE_TEST_SUITE_P(
                         X509_V_ERR_IP_ADDRESS_MISMATCH},
         CertificateCase{"NulInName", ServerCertificate::NulInName, "localhost",
                         X509_V_ERR_HOSTNAME_MISMATCH},
-        CertificateCase{"WildcardThatFits", ServerCertificate::Custom, "sts.example.com",
+        CertificateCase{"WildcardThatMatches", ServerCertificate::Custom, "sts.example.com",
                         X509_V_OK},
         CertificateCase{"WildcardOfOneLabelOnly", ServerCertificate::Custom, "a.sts.example.com",
                         X509_V_ERR_HOSTNAME_MISMATCH}),
     [](const auto& test) { return test.param.name; });
 
-TEST(TlsTest, OneServersAuthorityIsNotAnothers) {
+TEST(TlsTest, AnotherServersAuthorityIsNotTrusted) {
   const Server server;
   const Server other;
   RawClient client(server.HttpsPort());
@@ -81,7 +81,7 @@ TEST(TlsTest, RefusesModernClientsOverOldProtocols) {
   }
 }
 
-// What a careless client would do: the server must really speak it, or the refusals prove nothing.
+// The handshake of a careless client. The server must support it, or the refusals prove nothing.
 bool CarelessHandshake(const Server& server, int version, const char* ciphers) {
   const std::shared_ptr<SSL_CTX> context(SSL_CTX_new(TLS_client_method()), SSL_CTX_free);
   SSL_CTX_set_min_proto_version(context.get(), version);
@@ -112,16 +112,16 @@ TEST(TlsTest, RequiresAClientCertificate) {
   ServerOptions options;
   options.tls.requireClientCertificate = true;
   const Server server(options);
-  RawClient nobody(server.HttpsPort());
-  nobody.StartTls(server.CaCertificatePem());
+  RawClient anonymous(server.HttpsPort());
+  anonymous.StartTls(server.CaCertificatePem());
   EXPECT_TRUE(
       server.WaitUntil([](const Counters& counters) { return counters.handshakesFailed == 1; }));
 
   const Credential credential = server.MakeClientCredential("client one");
-  RawClient somebody(server.HttpsPort());
-  somebody.UseClientCredential(credential.certificatePem, credential.privateKeyPem);
-  ASSERT_EQ(somebody.StartTls(server.CaCertificatePem()), X509_V_OK);
-  EXPECT_THAT(Ask(somebody), StartsWith("HTTP/1.1 200 "));
+  RawClient identified(server.HttpsPort());
+  identified.UseClientCredential(credential.certificatePem, credential.privateKeyPem);
+  ASSERT_EQ(identified.StartTls(server.CaCertificatePem()), X509_V_OK);
+  EXPECT_THAT(Ask(identified), StartsWith("HTTP/1.1 200 "));
   EXPECT_EQ(server.LastRequest().peerCertificatePem, credential.certificatePem);
 }
 

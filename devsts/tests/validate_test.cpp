@@ -1,4 +1,4 @@
-// The verdicts of the Validate binding.
+// The results of the Validate operation.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -63,7 +63,7 @@ TEST(ValidateTest, FindsAnUnreadableTokenInvalid) {
   ExpectInvalid(AskAbout(server, bare), "The token has no Subject");
 }
 
-TEST(ValidateTest, FindsATokenOutOfItsTimeInvalid) {
+TEST(ValidateTest, FindsATokenOutsideItsValidityInvalid) {
   for (const long start : {-200L, 100L}) {
     ServerOptions options;
     options.assertion.beforeSigning = [start](std::string& text) {

@@ -65,14 +65,14 @@ TEST_P(SignatureAlgorithmTest, Verifies) {
   EXPECT_THAT(result.referenceUris, ElementsAre("#_1"));
 }
 
-TEST_P(SignatureAlgorithmTest, DoesNotHoldForOtherContent) {
+TEST_P(SignatureAlgorithmTest, DoesNotVerifyOtherContent) {
   const VerifyResult result =
       VerifyXml(Tampered(SignedText(), "hello", "hallo"), Make(GetParam().key).certificatePem);
   EXPECT_FALSE(result.valid);
   EXPECT_NE(result.reason, "");
 }
 
-TEST_P(SignatureAlgorithmTest, DoesNotHoldForAnotherKey) {
+TEST_P(SignatureAlgorithmTest, DoesNotVerifyWithAnotherKey) {
   const VerifyResult result = VerifyXml(SignedText(), Make(GetParam().key, true).certificatePem);
   EXPECT_FALSE(result.valid);
   EXPECT_NE(result.reason, "");
@@ -103,13 +103,13 @@ INSTANTIATE_TEST_SUITE_P(
                       DigestAlgorithm::Sha1, CanonicalMode::Exclusive}),
     [](const auto& test) { return test.param.name; });
 
-TEST(SignXmlTest, PutsTheSignatureBehindTheIssuer) {
+TEST(SignXmlTest, PutsTheSignatureAfterTheIssuer) {
   const std::string text = Sign(Make(KeyType::Rsa2048), {});
   EXPECT_THAT(text, HasSubstr("</a:Issuer><ds:Signature"));
   EXPECT_THAT(text, HasSubstr("<ds:X509Certificate>"));
 }
 
-TEST(SignXmlTest, LeavesKeyInfoOutIfAsked) {
+TEST(SignXmlTest, OmitsKeyInfoIfRequested) {
   SignOptions options;
   options.keyInfo = KeyInfoContent::None;
   const std::string text = Sign(Make(KeyType::Rsa2048), options);
@@ -117,7 +117,7 @@ TEST(SignXmlTest, LeavesKeyInfoOutIfAsked) {
   EXPECT_TRUE(VerifyXml(text, Make(KeyType::Rsa2048).certificatePem));
 }
 
-TEST(SignXmlTest, WritesAKeyValueIfAsked) {
+TEST(SignXmlTest, WritesAKeyValueIfRequested) {
   SignOptions options;
   options.keyInfo = KeyInfoContent::KeyValue;
   EXPECT_THAT(Sign(Make(KeyType::Rsa2048), options), HasSubstr("<ds:Modulus>"));
@@ -140,7 +140,7 @@ TEST(SignXmlTest, KeepsTheTemplateOfTheText) {
   EXPECT_THAT(result.referenceUris, ElementsAre(""));
 }
 
-TEST(SignXmlTest, WritesNonAsciiTextAsItIs) {
+TEST(SignXmlTest, WritesNonAsciiTextUnchanged) {
   EXPECT_THAT(Sign(Make(KeyType::Rsa2048), {}, "<r ID=\"_2\">\xC3\xA4</r>"),
               HasSubstr("<r ID=\"_2\">\xC3\xA4<ds:Signature"));
 }
@@ -237,7 +237,7 @@ struct CanonicalCase {
 
 class CanonicalFormTest : public testing::TestWithParam<CanonicalCase> {};
 
-TEST_P(CanonicalFormTest, IsAsTheRecommendationSays) {
+TEST_P(CanonicalFormTest, MatchesTheRecommendation) {
   const CanonicalCase& test = GetParam();
   EXPECT_EQ(Canonicalize(kTree, test.selector, test.mode, test.prefixes), test.expected);
 }

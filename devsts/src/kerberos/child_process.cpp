@@ -20,14 +20,14 @@ namespace DevSts {
 
 namespace {
 
-// How long a process may take to end when it is asked to.
+// How long a process may take to end after SIGTERM.
 constexpr auto kPatience = std::chrono::seconds(5);
 
 [[noreturn]] void ThrowSystemError(const std::string& attempt) {
   throw std::runtime_error(attempt + ": " + std::strerror(errno));
 }
 
-// Pointers to the texts, with a null behind them, as exec wants them.
+// Pointers to the texts, followed by a null pointer, as exec requires.
 std::vector<char*> PointersTo(const std::vector<std::string>& texts) {
   std::vector<char*> pointers;
   pointers.reserve(texts.size() + 1);
@@ -39,7 +39,7 @@ std::vector<char*> PointersTo(const std::vector<std::string>& texts) {
 }
 
 std::vector<std::string> EnvironmentWith(const std::vector<std::string>& variables) {
-  // What is named first counts.
+  // The first definition of a variable takes effect.
   std::vector<std::string> result = variables;
   for (char** next = environ; *next != nullptr; ++next) {
     result.emplace_back(*next);
@@ -72,12 +72,12 @@ pid_t Start(const Command& command) {
     ::close(input);
     ThrowSystemError("The file '" + command.outputPath + "' cannot be opened");
   }
-  // Between fork and exec only what is safe in a copy of a process with threads.
+  // Between fork and exec, only calls that are safe in the copy of a multi-threaded process.
   const pid_t process = ::fork();
   if (process == 0) {
-    // A test that crashes leaves nothing behind.
+    // A test that crashes leaves no process running.
     ::prctl(PR_SET_PDEATHSIG, SIGKILL);
-    // What the caller blocks must still end the program.
+    // Signals that the caller blocks must still end the program.
     sigset_t none;
     ::sigemptyset(&none);
     ::sigprocmask(SIG_SETMASK, &none, nullptr);
@@ -90,7 +90,7 @@ pid_t Start(const Command& command) {
   ::close(input);
   ::close(output);
   if (process < 0) {
-    ThrowSystemError("No process can be started");
+    ThrowSystemError("A process cannot be started");
   }
   return process;
 }

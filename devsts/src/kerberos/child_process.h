@@ -8,8 +8,9 @@
 
 namespace DevSts {
 
-/// A program with its arguments, run with the variables "NAME=value" added to the environment. Its
-/// output goes to a file. It ends with the thread that starts it, at the latest.
+/// A program with its arguments. It runs with the variables, each "NAME=value", added to the
+/// environment, and its output goes to a file. It is killed at the latest when the thread that
+/// started it ends.
 struct Command {
   std::vector<std::string> arguments;
   std::vector<std::string> variables;
@@ -17,10 +18,11 @@ struct Command {
   std::string input;  ///< for its standard input
 };
 
-/// Runs the command to its end. Throws `std::runtime_error` with its output when it fails.
+/// Runs the command and waits for its end. Throws `std::runtime_error` with its output if it fails.
 void RunToEnd(const Command& command);
 
-/// A process in the background. Ends with this object: asked to at first, killed after a while.
+/// A process in the background. The destructor ends it: with SIGTERM at first, with SIGKILL after a
+/// time-out.
 class BackgroundProcess {
  public:
   explicit BackgroundProcess(const Command& command);

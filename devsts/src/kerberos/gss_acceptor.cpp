@@ -31,7 +31,7 @@ GssCredentialHandle AcquireFrom(const std::string& keytab, gss_OID mechanism) {
 }  // namespace
 
 GssAcceptor::GssAcceptor(const std::string& keytab) {
-  // SPNEGO would not tell what it is that Kerberos lacks.
+  // SPNEGO would not report why Kerberos has no credentials.
   AcquireFrom(keytab, gss_mech_krb5);
   credential_ = AcquireFrom(keytab, SpnegoMechanism());
   OM_uint32 minor = 0;

@@ -9,10 +9,10 @@
 
 namespace DevSts {
 
-// What a service accepts logins with: the keys of a keytab, for Kerberos inside SPNEGO.
+// A service's credentials: the keys of a keytab, for Kerberos inside SPNEGO.
 class GssAcceptor {
  public:
-  // Throws GssError if there is no key to be had.
+  // Throws GssError if the keytab cannot be read or has no key.
   explicit GssAcceptor(const std::string& keytab);
 
   gss_cred_id_t Credential() const { return credential_.Get(); }
@@ -21,12 +21,12 @@ class GssAcceptor {
   GssCredentialHandle credential_;
 };
 
-// One login. On any thread, by one at a time. Each call throws GssError.
+// One login. May be used on any thread, but by one thread at a time. Each call throws GssError.
 class GssLogin {
  public:
   explicit GssLogin(std::shared_ptr<const GssAcceptor> acceptor) : acceptor_(std::move(acceptor)) {}
 
-  // Takes the client's next leg and gives the service's, which may be empty at the end.
+  // Takes the client's next leg and returns the service's, which may be empty at the end.
   Octets Take(const Octets& leg);
   bool IsDone() const { return done_; }
 

@@ -27,14 +27,14 @@ void RequireGss(OM_uint32 major, OM_uint32 minor) {
   if (GSS_ERROR(major) == 0) {
     return;
   }
-  // The text of a failure without a routine error of its own points to the mechanism's.
+  // The text of GSS_S_FAILURE only refers to the mechanism's text.
   const std::string cause = minor != 0 ? TextOf(minor, GSS_C_MECH_CODE) : std::string();
   if (GSS_ROUTINE_ERROR(major) == GSS_S_FAILURE && !cause.empty()) {
     throw GssError(cause, major);
   }
   const std::string text = TextOf(major, GSS_C_GSS_CODE);
-  const bool tells = !cause.empty() && cause != TextOf(0, GSS_C_MECH_CODE);
-  throw GssError(tells ? text + ": " + cause : text, major);
+  const bool isSpecific = !cause.empty() && cause != TextOf(0, GSS_C_MECH_CODE);
+  throw GssError(isSpecific ? text + ": " + cause : text, major);
 }
 
 }  // namespace DevSts

@@ -11,7 +11,7 @@
 
 namespace DevSts {
 
-// An object of the GSSAPI library (RFC 2744), released when this dies.
+// An object of the GSSAPI library (RFC 2744), released by the destructor.
 template <typename T, auto release>
 class GssHandle {
  public:
@@ -24,7 +24,7 @@ class GssHandle {
   }
 
   T Get() const { return object_; }
-  // For a call that fills or replaces it.
+  // For calls that set or replace the object.
   T* Address() { return &object_; }
 
  private:
@@ -46,7 +46,7 @@ using GssCredentialHandle = GssHandle<gss_cred_id_t, gss_release_cred>;
 using GssContextHandle = GssHandle<gss_ctx_id_t, DeleteGssContext>;
 using GssNameHandle = GssHandle<gss_name_t, gss_release_name>;
 
-// Memory that the library hands out.
+// Memory that the library has allocated.
 class GssBuffer {
  public:
   GssBuffer() = default;
@@ -67,7 +67,7 @@ class GssBuffer {
   gss_buffer_desc buffer_ = GSS_C_EMPTY_BUFFER;
 };
 
-// The octets as an argument, which must outlive it. The library does not write to it.
+// The octets as an argument of a call; they must outlive it. The library does not write to them.
 inline gss_buffer_desc AsGss(const Octets& octets) {
   return {octets.size(), const_cast<unsigned char*>(octets.data())};
 }
@@ -78,14 +78,15 @@ class GssError : public std::runtime_error {
   GssError(const std::string& text, OM_uint32 major)
       : std::runtime_error(text), routineError_(GSS_ROUTINE_ERROR(major)) {}
 
-  // GSS_S_... without supplementary bits.
+  // The routine error (GSS_S_...) without calling errors and supplementary bits.
   OM_uint32 RoutineError() const { return routineError_; }
 
  private:
   OM_uint32 routineError_;
 };
 
-// Throws GssError in the library's words if the status is one. On the thread of the call.
+// Throws GssError with the library's text if the status is an error. Must be called on the thread
+// of the failed call, for which the library keeps the text.
 void RequireGss(OM_uint32 major, OM_uint32 minor);
 
 }  // namespace DevSts

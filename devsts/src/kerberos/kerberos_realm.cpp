@@ -21,19 +21,19 @@ namespace {
 using Tcp = boost::asio::ip::tcp;
 using namespace std::chrono_literals;
 
-constexpr char kMasterPassword[] = "of-no-use-to-anybody";
+constexpr char kMasterPassword[] = "not-a-secret";
 constexpr int kAttempts = 5;
 constexpr auto kPatience = 30s;
 
 std::string CreateFolder() {
   std::string pattern = std::filesystem::temp_directory_path() / "devsts-realm-XXXXXX";
   if (::mkdtemp(pattern.data()) == nullptr) {
-    throw std::runtime_error("No temporary folder can be made for a realm");
+    throw std::runtime_error("A temporary folder for the realm cannot be created");
   }
   return pattern;
 }
 
-// Somebody else may take the port before the KDC does.
+// Another process may take the port before the KDC does.
 unsigned short FreePort() {
   boost::asio::io_context context;
   const Tcp::acceptor acceptor(context, {boost::asio::ip::make_address("127.0.0.1"), 0});
@@ -60,7 +60,7 @@ void WriteFile(const std::string& path, const std::string& text) {
   }
 }
 
-// A name without what a file or a command of the tools would read otherwise.
+// Returns the name. Throws if a configuration file or a command of the tools would misread it.
 std::string Checked(const std::string& name) {
   if (name.empty() || name.front() == '-' ||
       name.find_first_of(" \t\r\n\"\\") != std::string::npos) {
@@ -116,7 +116,7 @@ class KerberosRealm::State {
     std::vector<std::string> variables = {"KRB5_CONFIG=" + configPath,
                                           "KRB5_KDC_PROFILE=" + folder + "/kdc.conf"};
     if (clockOffset.count() != 0) {
-      // The loader puts the library folder of the platform for $LIB.
+      // The loader replaces $LIB with the platform's library folder.
       variables.emplace_back("LD_PRELOAD=/usr/$LIB/faketime/libfaketimeMT.so.1");
       variables.push_back("FAKETIME=" + SignedText(clockOffset));
       variables.emplace_back("FAKETIME_DONT_FAKE_MONOTONIC=1");

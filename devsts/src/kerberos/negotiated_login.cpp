@@ -13,7 +13,7 @@ Octets NegotiatedLogin::Take(const Octets& leg) {
   }
   try {
     Octets answer = TakeByStage(leg);
-    // Without a token an answer must say something.
+    // An answer without a token must contain a leg.
     return answer.empty() && !IsDone() ? WriteResponse(NegState::AcceptIncomplete) : answer;
   } catch (const SpnegoError& error) {
     ThrowInvalidRequest(std::string("The leg is not readable: ") + error.what());
@@ -34,9 +34,9 @@ Octets NegotiatedLogin::TakeByStage(const Octets& leg) {
 }
 
 Octets NegotiatedLogin::TakeMechanismLeg(const Octets& leg) {
-  // An empty one would make the library ask first, which is another protocol's way.
+  // With an empty leg the library would send the first message itself, which is another protocol.
   if (leg.empty()) {
-    ThrowInvalidRequest("The BinaryExchange holds no leg");
+    ThrowInvalidRequest("The BinaryExchange contains no leg");
   }
   const bool isFirst = legs_ == 1;
   Octets answer = login_.Take(leg);

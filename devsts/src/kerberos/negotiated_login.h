@@ -10,13 +10,14 @@
 
 namespace DevSts {
 
-// The legs of one login by the script. On any thread, by one at a time.
+// The legs of one login, as the script prescribes. May be used on any thread, but by one thread at
+// a time.
 class NegotiatedLogin {
  public:
   NegotiatedLogin(std::shared_ptr<const GssAcceptor> acceptor, NegotiationScript script)
       : login_(std::move(acceptor)), script_(std::move(script)) {}
 
-  // Takes the client's next leg and gives the service's, which may be empty at the end. Throws
+  // Takes the client's next leg and returns the service's, which may be empty at the end. Throws
   // Fault.
   Octets Take(const Octets& leg);
   bool IsDone() const { return stage_ == Stage::Done; }

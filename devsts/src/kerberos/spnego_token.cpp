@@ -28,7 +28,7 @@ struct Element {
   View content;
 };
 
-// Takes the first element off the octets.
+// Removes the first element from the octets and returns it.
 Element Take(View& octets) {
   if (octets.size() < 2) {
     throw SpnegoError("the message ends early");

@@ -5,11 +5,11 @@
 
 #include "xml/schema_values.h"
 
-// SPNEGO's messages (RFC 4178, section 4.2), as far as a service looks at them that leaves the rest
-// to the GSSAPI library.
+// The parts of SPNEGO messages (RFC 4178, section 4.2) that the service reads and writes itself;
+// the GSSAPI library handles the rest.
 namespace DevSts {
 
-// The octets are not the message that they should be.
+// The octets are not a valid message.
 class SpnegoError : public std::runtime_error {
  public:
   using std::runtime_error::runtime_error;
@@ -19,17 +19,18 @@ enum class NegState : unsigned char {
   AcceptIncomplete = 1,
 };
 
-// The list of mechanisms in a client's first leg, encoded as it stands there: what a mechListMIC
-// signs. Throws SpnegoError.
+// The encoded list of mechanisms in a client's first leg, which a mechListMIC signs. Throws
+// SpnegoError.
 Octets MechTypesIn(const Octets& firstLeg);
 
-// The NegTokenResp, which has a state, with this one and with a mechListMIC. Throws SpnegoError.
+// The NegTokenResp with its state replaced and a mechListMIC added. It must have a state. Throws
+// SpnegoError.
 Octets WithMic(const Octets& response, NegState state, const Octets& mic);
 
 // The mechListMIC of a NegTokenResp, empty if there is none. Throws SpnegoError.
 Octets MicIn(const Octets& response);
 
-// A NegTokenResp with a state alone.
+// A NegTokenResp that contains only a state.
 Octets WriteResponse(NegState state);
 
 }  // namespace DevSts

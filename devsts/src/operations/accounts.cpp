@@ -71,7 +71,7 @@ std::pair<std::string, User> Accounts::OwnerOf(const std::string& certificatePem
       return {name, user};
     }
   }
-  ThrowFailedAuthentication("The certificate is nobody's");
+  ThrowFailedAuthentication("The certificate belongs to no user");
 }
 
 bool Accounts::Has(const std::string& name) const {

@@ -9,21 +9,22 @@
 
 namespace DevSts {
 
-// Who may ask for tokens. Safe on any thread.
+// The users who may ask for tokens. Thread-safe.
 class Accounts {
  public:
   explicit Accounts(Users users);
 
   void Set(Users users);
-  // Throws std::out_of_range for an unknown user, std::runtime_error for no certificate.
+  // Throws std::out_of_range for an unknown user, std::runtime_error if the certificate does not
+  // load.
   void AddCertificate(const std::string& name, const std::string& certificatePem);
 
-  // Throws Fault.
+  // Throws Fault if the password is wrong or has expired.
   User Authenticate(const std::string& name, const std::string& password) const;
-  // The user who has this certificate, with the name. Throws Fault.
+  // The name and the account of the user who has this certificate. Throws Fault if there is none.
   std::pair<std::string, User> OwnerOf(const std::string& certificatePem) const;
   bool Has(const std::string& name) const;
-  // A user of no properties if there is none of this name.
+  // An account without properties if there is no user of this name.
   User Find(const std::string& name) const;
 
  private:

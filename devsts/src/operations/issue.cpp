@@ -17,11 +17,11 @@ constexpr char kPasswordClass[] =
 constexpr char kKerberosClass[] = "urn:oasis:names:tc:SAML:2.0:ac:classes:Kerberos";
 constexpr char kCertificateClass[] = "urn:oasis:names:tc:SAML:2.0:ac:classes:X509";
 
-// Who asks, and how far what it presents may be handed on.
+// The requester, and how often the token that it presents may be delegated further.
 struct Requester {
   std::string name;
-  // Delegations that the token still allows which the new one is based on; none: it is based on
-  // no token.
+  // The delegations that the presented token still allows; empty if the new token is not based on
+  // another one.
   std::optional<unsigned> proxyCount;
 };
 
@@ -30,7 +30,7 @@ bool IsPrincipalName(const std::string& name) {
   return at != std::string::npos && at != 0 && at + 1 != name.size();
 }
 
-void RequireFittingUseKey(const IssueRequest& request, const KeyProof& proof) {
+void RequireMatchingUseKey(const IssueRequest& request, const KeyProof& proof) {
   if (proof.form == RequestSignature::ByToken) {
     if (request.usesKey) {
       ThrowInvalidRequest("UseKey is not expected in a request made with a token");
@@ -44,21 +44,21 @@ void RequireFittingUseKey(const IssueRequest& request, const KeyProof& proof) {
     ThrowInvalidRequest("UseKey is missing");
   }
   if (request.delegateTo && request.usesKey) {
-    ThrowInvalidRequest("UseKey is not expected beside DelegateTo");
+    ThrowInvalidRequest("UseKey is not expected together with DelegateTo");
   }
 }
 
-// WS-Trust 1.3, section 9.2: a key is bound to a token only after its possession was proven.
+// WS-Trust 1.3, section 9.2: a key is bound to a token only after its possession has been proved.
 void RequireProvenKey(const IssueRequest& request, const std::optional<KeyProof>& proof) {
   if (proof) {
-    RequireFittingUseKey(request, *proof);
+    RequireMatchingUseKey(request, *proof);
     return;
   }
   if (request.publicKey) {
     ThrowInvalidRequest("PublicKey tokens are not issued to unsigned requests");
   }
   if (request.usesKey) {
-    ThrowInvalidRequest("UseKey names a signature that is not there");
+    ThrowInvalidRequest("UseKey names a signature that does not exist");
   }
 }
 
@@ -89,7 +89,7 @@ Requester LogOn(TokenContent& content, const CheckedRequest& request, const Acco
     return {content.subject, std::nullopt};
   }
   if (!request.proof) {
-    ThrowInvalidSecurity("No UsernameToken and no Signature behind the Timestamp");
+    ThrowInvalidSecurity("No UsernameToken and no Signature after the Timestamp");
   }
   std::tie(content.subject, content.user) = accounts.OwnerOf(request.proof->certificatePem);
   content.authenticationClass = kCertificateClass;
@@ -117,8 +117,8 @@ Requester Identify(TokenContent& content, const CheckedRequest& request,
   return byToken ? UseToken(content, request, parts) : LogOn(content, request, parts.accounts);
 }
 
-// Makes the content speak of the subject of the ActAs token (WS-Trust 1.4, section 9.3), with the
-// requester at the end of its delegation chain.
+// Replaces the subject by that of the ActAs token (WS-Trust 1.4, section 9.3) and appends the
+// requester to its delegation chain.
 void ActAs(xmlNode* assertion, Requester& requester, TokenContent& content,
            const CheckedRequest& request, const ServiceParts& parts) {
   const std::string place = "The ActAs token";
@@ -138,14 +138,14 @@ void ActAs(xmlNode* assertion, Requester& requester, TokenContent& content,
   requester.proxyCount = token.proxyCount;
 }
 
-// SAML 2.0 Core, section 2.5.1.6: what is based on a token may be handed on once less than it.
+// SAML 2.0 Core, section 2.5.1.6: a token that is based on another one may be delegated once less.
 void AddProxyRestriction(const Requester& requester, unsigned most, TokenContent& content) {
   if (!requester.proxyCount) {
     content.proxyCount = most;
     return;
   }
   if (*requester.proxyCount == 0) {
-    ThrowInvalidRequest("What is based on a token that is not delegable cannot be delegable");
+    ThrowInvalidRequest("A token that is based on one that is not delegable cannot be delegable");
   }
   content.proxyCount = std::min(most, *requester.proxyCount - 1);
 }
@@ -155,8 +155,8 @@ void DelegateTo(const std::string& name, const Requester& requester, TokenConten
     ThrowInvalidRequest("DelegateTo is not a user principal name: " + name);
   }
   if (requester.proxyCount && *requester.proxyCount == 0) {
-    ThrowInvalidRequest("What is based on a token that is not delegable cannot be delegated to " +
-                        name);
+    ThrowInvalidRequest(
+        "A token that is based on one that is not delegable cannot be delegated to " + name);
   }
   content.delegates.push_back({name, content.issued});
 }

@@ -41,7 +41,7 @@ void NegotiationStore::Turn::Keep(const std::string& context) {
   const std::lock_guard lock(store_->mutex_);
   const auto found = store_->entries_.find(context_);
   if (found == store_->entries_.end() || found->second.serial != serial_) {
-    return;  // forgotten meanwhile
+    return;  // forgotten in the meantime
   }
   found->second.pending = std::move(pending_);
   if (context != context_) {
@@ -77,7 +77,7 @@ NegotiationStore::Turn NegotiationStore::Resume(const std::string& context,
   }
   Entry& entry = found->second;
   if (!IsSame(cookie, entry.cookie)) {
-    ThrowInvalidRequest("The request does not carry the cookie of its negotiation");
+    ThrowInvalidRequest("The request does not have the cookie of its negotiation");
   }
   if (entry.pending == nullptr) {
     ThrowInvalidRequest("The negotiation is busy with another leg");

@@ -14,21 +14,21 @@
 
 namespace DevSts {
 
-// A request for a token whose login is under way.
+// A request for a token whose login is in progress.
 struct PendingIssue {
-  CheckedRequest request;  // its document has what `issue` points into
+  CheckedRequest request;  // owns the document that `issue` points into
   IssueRequest issue;
   NegotiatedLogin login;
 };
 
-// The negotiations that are under way, by Context. Each is worked on by one thread at a time. Safe
-// on any thread.
+// The negotiations in progress, by Context. One thread at a time works on each. Thread-safe.
 class NegotiationStore {
  public:
   NegotiationStore(std::size_t limit, std::chrono::milliseconds maxAge)
       : limit_(limit), maxAge_(maxAge) {}
 
-  // One thread's work on a negotiation, which is forgotten with it unless it is kept.
+  // One thread's turn to work on a negotiation. The destructor forgets the negotiation unless
+  // `Keep` was called.
   class Turn {
    public:
     ~Turn();
@@ -37,9 +37,9 @@ class NegotiationStore {
     Turn& operator=(const Turn&) = delete;
 
     PendingIssue& Pending() { return *pending_; }
-    // What a client must send along with the later legs.
+    // The cookie that the client must send with the later legs.
     const std::string& Cookie() const { return cookie_; }
-    // Ends the turn. The negotiation goes on, from now on by this Context.
+    // Ends the turn. The negotiation continues, from now on in this Context.
     void Keep(const std::string& context);
 
    private:
@@ -54,10 +54,10 @@ class NegotiationStore {
     std::unique_ptr<PendingIssue> pending_;
   };
 
-  // Throws Fault if the Context is taken.
+  // Throws Fault if the Context is in use.
   Turn Begin(const std::string& context, PendingIssue pending);
   // Throws Fault if there is no such negotiation, if another thread works on it, or if the cookie
-  // is not its own; then it stays as it is.
+  // belongs to another one; the negotiation is then unchanged.
   Turn Resume(const std::string& context, const std::string& cookie);
 
   std::size_t Size() const;
@@ -69,7 +69,7 @@ class NegotiationStore {
     std::uint64_t serial = 0;
     std::string cookie;
     Clock::time_point begun;
-    std::unique_ptr<PendingIssue> pending;  // none while it is worked on
+    std::unique_ptr<PendingIssue> pending;  // null during a turn
   };
 
   void ForgetOld();

@@ -15,7 +15,7 @@ std::shared_ptr<const GssAcceptor> AcceptorFor(const std::string& keytab) {
   return keytab.empty() ? nullptr : std::make_shared<const GssAcceptor>(keytab);
 }
 
-// The negotiation is what tells who asks.
+// The negotiation identifies the requester.
 void RequireNoOtherLogin(const CheckedRequest& request) {
   if (request.header.userNameToken) {
     ThrowInvalidSecurity("A UsernameToken is not expected in a negotiation");
@@ -25,7 +25,7 @@ void RequireNoOtherLogin(const CheckedRequest& request) {
   }
 }
 
-// RFC 6265, sections 4.2.1 and 5.4. Empty if the cookie is not there.
+// RFC 6265, sections 4.2.1 and 5.4. Empty if there is no such cookie.
 std::string CookieOf(const ReceivedRequest& request) {
   if (request.HeaderCount("Cookie") > 1) {
     ThrowInvalidRequest("Cookie is given more than once");
@@ -91,7 +91,8 @@ LegReply Negotiator::Continue(const CheckedRequest& request, const ReceivedReque
                               ReceivedLeg& seen) {
   RequireAcceptor();
   if (request.header.userNameToken || request.proof) {
-    ThrowInvalidSecurity("Neither login nor signature is expected where a negotiation goes on");
+    ThrowInvalidSecurity(
+        "Neither a login nor a signature is expected in a later leg of a negotiation");
   }
   NegotiationStore::Turn turn = store_.Resume(seen.context, CookieOf(received));
   turn.Pending().request.now = request.now;
@@ -128,7 +129,7 @@ std::string Negotiator::UserOf(const std::string& principal, const Accounts& acc
   const auto mapped = principals_.find(principal);
   const std::string& user = mapped != principals_.end() ? mapped->second : principal;
   if (!accounts.Has(user)) {
-    ThrowFailedAuthentication("The principal is nobody's: " + principal);
+    ThrowFailedAuthentication("The principal belongs to no user: " + principal);
   }
   return user;
 }

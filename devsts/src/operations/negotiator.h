@@ -20,13 +20,13 @@ struct LegReply {
   bool holdsToken = false;
 };
 
-// Issues tokens to those who log in by a negotiation. Safe on any thread.
+// Issues tokens to clients that log in by a negotiation. Thread-safe.
 class Negotiator {
  public:
-  // Throws GssError if the keytab holds no key.
+  // Throws GssError if the keytab has no key.
   explicit Negotiator(const NegotiationOptions& options);
 
-  // Both count the leg in `seen` and throw Fault.
+  // Both set the ordinal of the leg in `seen`. Both throw Fault.
   LegReply Begin(CheckedRequest request, IssueRequest issue, const ReceivedRequest& received,
                  const LegMisbehavior& misbehavior, ServiceParts& parts, ReceivedLeg& seen);
   LegReply Continue(const CheckedRequest& request, const ReceivedRequest& received,

@@ -15,7 +15,7 @@
 
 namespace DevSts {
 
-// What the operations share.
+// The state that the operations share.
 struct ServiceParts {
   const std::chrono::seconds clockSkew;
   const IssuerIdentity identity;
@@ -23,7 +23,7 @@ struct ServiceParts {
   TokenStore tokens;
 };
 
-// A request whose envelope, header and signature were found right.
+// A request whose envelope, header and signature have been checked.
 struct CheckedRequest {
   SoapRequest soap;
   SecurityHeader header;
@@ -32,14 +32,15 @@ struct CheckedRequest {
   Time now;
 };
 
-// Reads an Issue request and judges all but who makes it. Throws Fault.
+// Reads an Issue request and checks everything except the requester's identity. Throws Fault.
 IssueRequest PrepareIssue(const CheckedRequest& request, const ServiceParts& parts);
 
-// Issues to the user who logged in by a negotiation, which ends with this leg. Throws Fault.
+// Issues a token to the user who has logged in by a negotiation, of which `leg` is the last leg.
+// Throws Fault.
 std::string IssueTo(const std::string& userName, const IssueRequest& issue,
                     const CheckedRequest& request, ServiceParts& parts, const ServerLeg& leg);
 
-// Each gives the answer's envelope or throws Fault.
+// Each returns the answer's envelope or throws Fault.
 std::string Issue(const IssueRequest& issue, const CheckedRequest& request, ServiceParts& parts);
 std::string Renew(const CheckedRequest& request, ServiceParts& parts);
 
@@ -50,10 +51,10 @@ std::string MakeId();
 std::string IssueAndRemember(TokenContent content, const CheckedRequest& request,
                              ServiceParts& parts, TokenAnswer kind, const ServerLeg& leg = {});
 
-// The end of a token that begins at `from`.
+// The end of the validity of a token that is valid from `from`.
 Time GrantedEnd(Time from, std::chrono::milliseconds asked, const AssertionOptions& shape);
 
-// WS-Trust 1.3, section 11, InvalidTimeRange.
+// Throws the fault InvalidTimeRange (WS-Trust 1.3, section 11) unless the lifetime is positive.
 void RequireSensibleLifetime(Time created, Time expires);
 
 }  // namespace DevSts

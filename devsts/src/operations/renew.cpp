@@ -35,7 +35,7 @@ IssuedToken RequireRenewableState(TokenVerdict verdict, const PresentedToken& to
   return std::move(*verdict.issued);
 }
 
-// What is left of the right to renew after this renewal.
+// The renew restriction that remains after this renewal.
 RenewRestriction TakeOneRenewal(const PresentedToken& token) {
   if (!token.renewal) {
     ThrowUnableToRenew(std::string(kPlace) + " is not renewable");
@@ -48,7 +48,7 @@ RenewRestriction TakeOneRenewal(const PresentedToken& token) {
   return left;
 }
 
-// WS-Trust 1.3, section 5: a renewed token that begins in the future is a postdated one.
+// WS-Trust 1.3, section 5: a renewed token that begins in the future is postdated.
 Time StartOf(const RenewRequest& request, const RenewRestriction& restriction, Time now,
              std::chrono::seconds skew) {
   if (request.created <= now + skew) {

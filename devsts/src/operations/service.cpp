@@ -53,7 +53,7 @@ SoapReply ReplyOf(LegReply leg) {
   return reply;
 }
 
-ReceivedLeg Seeing(const NegotiationLeg& leg) {
+ReceivedLeg SeenLeg(const NegotiationLeg& leg) {
   return {leg.context, 0, std::string(leg.octets.begin(), leg.octets.end())};
 }
 
@@ -131,14 +131,14 @@ SoapReply Service::AnswerIssue(CheckedRequest request, const ReceivedRequest& re
   if (!issue.leg) {
     return TokenReply(Issue(issue, request, parts_));
   }
-  seen.leg = Seeing(*issue.leg);
+  seen.leg = SeenLeg(*issue.leg);
   return ReplyOf(negotiator_.Begin(std::move(request), std::move(issue), received, misbehavior,
                                    parts_, *seen.leg));
 }
 
 SoapReply Service::AnswerContinued(const CheckedRequest& request, const ReceivedRequest& received,
                                    const LegMisbehavior& misbehavior, Seen& seen) {
-  seen.leg = Seeing(ReadContinuedLeg(request.soap.bodyEntry));
+  seen.leg = SeenLeg(ReadContinuedLeg(request.soap.bodyEntry));
   return ReplyOf(negotiator_.Continue(request, received, misbehavior, parts_, *seen.leg));
 }
 

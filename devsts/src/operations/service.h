@@ -13,26 +13,26 @@
 
 namespace DevSts {
 
-// What the service says to a request, before any misbehaviour.
+// The service's answer to a request, before any misbehaviour is applied.
 struct SoapReply {
   int status = 200;
   std::string envelope;
-  std::string faultString;  // of a fault
+  std::string faultString;  // if it is a fault
   bool isFault = false;
   bool holdsToken = false;
   std::vector<std::string> setCookies;
-  // How the request was seen to be signed, and the leg that it was seen to carry.
+  // The signature form and the negotiation leg that were found in the request.
   RequestSignature signature = RequestSignature::None;
   std::optional<ReceivedLeg> leg;
 };
 
-// The service itself: requests in, envelopes out, no network. Safe on any thread.
+// The service without the network: it turns requests into envelopes. Thread-safe.
 class Service {
  public:
-  // Throws GssError if the keytab of the options holds no key.
+  // Throws GssError if the keytab of the options has no key.
   Service(const ServerOptions& options, Credential signing);
 
-  // `misbehavior` concerns the legs of negotiations.
+  // `misbehavior` applies to the legs of negotiations.
   SoapReply Answer(const ReceivedRequest& request, const LegMisbehavior& misbehavior);
   static SoapReply AnswerFault(const FaultAnswer& fault);
 
@@ -46,7 +46,7 @@ class Service {
   std::size_t OpenNegotiations() const { return negotiator_.Open(); }
 
  private:
-  // What was seen of a request, if it is refused, too.
+  // What was found in a request, even if it is refused.
   struct Seen {
     RequestSignature signature = RequestSignature::None;
     std::optional<ReceivedLeg> leg;

@@ -8,8 +8,8 @@ namespace {
 constexpr char kStart[] = "<saml2:Assertion";
 constexpr char kEnd[] = "</saml2:Assertion>";
 
-// The ID is looked for in the text: hooks may have changed it, and the text alone may lack its
-// namespaces.
+// Searches the text for the ID: hooks may have changed it, and the text need not be well-formed on
+// its own, because its namespaces may be declared outside.
 std::string FirstIdIn(const std::string& assertion) {
   constexpr char kId[] = " ID=\"";
   const std::size_t start = assertion.find(kId);
@@ -24,7 +24,7 @@ void EditAssertion(std::string& envelope, const std::function<void(std::string&)
   const std::size_t start = envelope.find(kStart);
   const std::size_t end = envelope.rfind(kEnd);
   if (start == std::string::npos || end == std::string::npos) {
-    throw std::logic_error("the answer holds no saml2:Assertion to edit");
+    throw std::logic_error("the answer contains no saml2:Assertion to edit");
   }
   const std::size_t size = end + sizeof kEnd - 1 - start;
   std::string assertion = envelope.substr(start, size);

@@ -8,7 +8,7 @@
 
 namespace DevSts {
 
-// Who signs, and under which names.
+// The issuer's names and its signing credential.
 struct IssuerIdentity {
   std::string issuer;
   std::string vendorHost;
@@ -16,14 +16,14 @@ struct IssuerIdentity {
   Credential signing;
 };
 
-// An answer's envelope, and the ID that its assertion came to have.
+// An answer's envelope and the final ID of its assertion.
 struct IssuedAnswer {
   std::string envelope;
   std::string assertionId;
 };
 
-// Makes the envelope of an answer with a signed assertion. The signature is made in its place, so
-// that it holds there under inclusive canonical form, too.
+// Makes the envelope of an answer with a signed assertion. The assertion is signed inside the
+// envelope, so that the signature is valid there under inclusive canonical form, too.
 IssuedAnswer IssueToken(const TokenContent& content, const AssertionOptions& shape,
                         const IssuerIdentity& identity, TokenAnswer kind,
                         const ServerLeg& leg = {});

@@ -17,13 +17,13 @@ struct IssuedToken {
   bool revoked = false;
 };
 
-// The tokens that were issued last, by ID. Safe on any thread.
+// The most recently issued tokens, by ID. Thread-safe.
 class TokenStore {
  public:
   explicit TokenStore(std::size_t limit) : limit_(limit) {}
 
   void Remember(const std::string& id, TokenContent content);
-  // False if there is none of this ID.
+  // Returns false if there is no token with this ID.
   bool Revoke(const std::string& id);
   std::optional<IssuedToken> Find(const std::string& id) const;
 

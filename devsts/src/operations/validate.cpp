@@ -10,7 +10,7 @@
 namespace DevSts {
 namespace {
 
-// What is wrong with the signature; empty if nothing is.
+// What is wrong with the signature; empty if it is valid.
 std::string SignatureProblem(xmlNode* assertion, const std::string& signingPem) {
   xmlNode* signature = nullptr;
   for (xmlNode* child : ChildElements(assertion)) {

@@ -12,7 +12,7 @@
 
 namespace DevSts {
 
-// What a token is that somebody presents, the worst first.
+// The state of a presented token, the worst first.
 enum class TokenState {
   Forged,
   Unknown,
@@ -24,23 +24,23 @@ enum class TokenState {
 
 struct TokenVerdict {
   TokenState state = TokenState::Forged;
-  // Follows the token's name in a sentence; empty for a good one.
+  // What is wrong, worded to follow the token's name; empty for a valid token.
   std::string problem;
-  // What was issued under the token's ID; of every state from NotYetValid on.
+  // What was issued under the token's ID; present for NotYetValid, Expired and Valid.
   std::optional<IssuedToken> issued;
 };
 
-// Judges an assertion in a document whose ids are registered: signed by this service over all of
-// it, known, not revoked, current.
+// Checks that an assertion is completely signed by this service, known, not revoked and within its
+// validity period. The ids of its document must be registered.
 TokenVerdict CheckToken(xmlNode* assertion, const PresentedToken& token,
                         const std::string& signingPem, const TokenStore& store, Time now);
 
-// The same; anything but a good token is a Fault in which `place` names it.
+// The same, but throws Fault for any token that is not valid; `place` names the token in it.
 IssuedToken RequireValidToken(xmlNode* assertion, const PresentedToken& token,
                               const std::string& place, const std::string& signingPem,
                               const TokenStore& store, Time now);
 
-// The operation: gives the envelope of the answer. Throws Fault.
+// The Validate operation. Returns the envelope of the answer or throws Fault.
 std::string Validate(const CheckedRequest& request, const ServiceParts& parts);
 
 }  // namespace DevSts

@@ -7,15 +7,15 @@
 
 namespace DevSts {
 
-// Identifiers of XML Signature 1.1, section 6.1, and RFC 6931, section 2.3.10.
+// The identifiers in XML Signature 1.1, section 6.1, and RFC 6931, section 2.3.10.
 const char* UriOf(SignatureAlgorithm algorithm);
 const char* UriOf(DigestAlgorithm algorithm);
 const char* UriOf(CanonicalMode mode);
 
-// The name OpenSSL knows the digest of an RSA-PSS signature by; null for every other signature URI.
+// OpenSSL's name of the digest of an RSA-PSS signature; null for every other signature URI.
 const char* PssDigestOf(std::string_view signatureUri);
 
-// The canonical form of an identifier. Throws XmlError for an unknown one.
+// The canonical form that an identifier names. Throws XmlError for an unknown one.
 CanonicalMode CanonicalModeOf(std::string_view uri);
 
 }  // namespace DevSts

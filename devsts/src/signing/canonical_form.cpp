@@ -23,8 +23,8 @@ bool KeepsComments(CanonicalMode mode) {
          mode == CanonicalMode::ExclusiveWithComments;
 }
 
-// Attributes and namespace declarations are visible where their element is, which libxml2 gives as
-// parent.
+// Attributes and namespace declarations are visible if their element is, which libxml2 passes as
+// `parent`.
 int IsWithin(void* apex, xmlNode* node, xmlNode* parent) {
   if (apex == nullptr) {
     return 1;
@@ -69,7 +69,7 @@ xmlNode* ElementOfXPath(xmlDoc* document, const std::string& expression) {
   if (!result || result->type != XPATH_NODESET ||
       xmlXPathNodeSetGetLength(result->nodesetval) != 1 ||
       result->nodesetval->nodeTab[0]->type != XML_ELEMENT_NODE) {
-    throw XmlError("the expression does not give one element: " + expression);
+    throw XmlError("the expression does not select exactly one element: " + expression);
   }
   return result->nodesetval->nodeTab[0];
 }

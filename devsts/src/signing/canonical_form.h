@@ -10,8 +10,8 @@
 
 namespace DevSts {
 
-// The canonical form of the element with its content in its document; of the whole document if
-// null. Throws XmlError.
+// The canonical form of the element and its content, as part of its document; of the whole document
+// if `element` is null. Throws XmlError.
 std::string CanonicalForm(xmlDoc* document, xmlNode* element, CanonicalMode mode,
                           const std::vector<std::string>& inclusivePrefixes);
 

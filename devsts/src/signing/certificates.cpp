@@ -176,7 +176,7 @@ std::string CertificateFromBase64(const std::string& der) {
     ThrowOpenSslError("certificate does not load");
   }
   if (at != octets.data() + octets.size()) {
-    throw std::runtime_error("octets behind a certificate");
+    throw std::runtime_error("octets after the certificate");
   }
   return CertificateToPem(certificate.get());
 }

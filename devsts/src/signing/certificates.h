@@ -7,16 +7,16 @@
 
 namespace DevSts {
 
-// Certificates as PEM texts. Two texts from these functions are equal when the certificates are.
-// Each throws std::runtime_error for a certificate that does not load.
+// Certificates as PEM texts. Two texts that these functions return are equal if and only if the
+// certificates are equal. Each function throws std::runtime_error if a certificate does not load.
 std::string CertificateFromBase64(const std::string& der);
 std::string CertificateToBase64(const std::string& pem);
 std::string PlainPem(const std::string& pem);
 
-// Whether the time now is within the certificate's validity.
+// Whether the certificate is valid at the current time.
 bool IsCurrent(const std::string& pem);
 bool HasSameKey(const std::string& onePem, const std::string& otherPem);
-// An RSA key that NIST SP 800-131A still allows for signatures.
+// Whether the key is an RSA key that NIST SP 800-131A still allows for signatures.
 bool HasStrongRsaKey(const std::string& pem);
 
 }  // namespace DevSts

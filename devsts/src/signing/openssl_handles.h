@@ -28,10 +28,10 @@ using CertificateHandle = std::unique_ptr<X509, FreeWith<X509_free>>;
 using SslContextHandle = std::unique_ptr<SSL_CTX, FreeWith<SSL_CTX_free>>;
 using SslHandle = std::unique_ptr<SSL, FreeWith<SSL_free>>;
 
-// Throws std::runtime_error with OpenSSL's newest error, and empties its queue.
+// Throws std::runtime_error with OpenSSL's latest error, and clears its error queue.
 [[noreturn]] void ThrowOpenSslError(const std::string& what);
 
-// Each throws std::runtime_error when the text does not load.
+// Each throws std::runtime_error if the text cannot be loaded.
 CertificateHandle LoadCertificate(std::string_view pem);
 KeyHandle LoadPrivateKey(std::string_view pem);
 

@@ -33,7 +33,7 @@ class TemplateWriter {
   xmlNs* namespace_;
 };
 
-// Exclusive XML Canonicalization 1.0, section 4; the inclusive forms have no such parameter.
+// Exclusive XML Canonicalization 1.0, section 4; the inclusive forms have no prefix list.
 void AddInclusiveNamespaces(xmlNode* transform, const SignOptions& options) {
   const bool exclusive = options.canonicalization == CanonicalMode::Exclusive ||
                          options.canonicalization == CanonicalMode::ExclusiveWithComments;

@@ -7,11 +7,11 @@
 
 namespace DevSts {
 
-// The element that `options` asks to sign. Throws XmlError.
+// The element that `options` selects for signing. Throws XmlError.
 xmlNode* ElementToSign(xmlDoc* document, const SignOptions& options);
 
-// Puts a signature without values into the element, where SAML 2.0 (Core, section 2.3.3) wants it,
-// and gives it.
+// Inserts a signature without values into the element, at the place that SAML 2.0 requires (Core,
+// section 2.3.3), and returns it.
 xmlNode* AddSignatureTemplate(xmlNode* element, const SignOptions& options);
 
 }  // namespace DevSts

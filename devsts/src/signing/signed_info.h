@@ -15,11 +15,11 @@ xmlNode* SignatureChild(const xmlNode* parent, const char* localName);
 std::string SignatureMethodOf(const xmlNode* signature);
 void SetSignatureMethod(xmlNode* signature, const char* uri);
 
-// SignedInfo in the canonical form that it names.
+// SignedInfo in the canonical form that its CanonicalizationMethod names.
 std::string CanonicalSignedInfo(xmlNode* signature);
 
-// xmlsec1 1.2 knows no RSA-PSS: these two make and check that signature value with OpenSSL
-// (RFC 8017, section 8.1; salt as long as the digest, as RFC 6931 section 2.3.10 has it).
+// xmlsec1 1.2 does not support RSA-PSS: these two compute and verify the signature value with
+// OpenSSL (RFC 8017, section 8.1; the salt is as long as the digest: RFC 6931, section 2.3.10).
 void WritePssSignatureValue(xmlNode* signature, std::string_view keyPem);
 bool PssSignatureValueIsRight(xmlNode* signature, std::string_view certificatePem);
 

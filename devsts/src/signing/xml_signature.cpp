@@ -55,7 +55,7 @@ XmlSecKeyHandle PublicKeyOf(X509* certificate) {
   xmlSecKeyDataPtr value = xmlSecOpenSSLEvpKeyAdopt(publicKey);
   if (value == nullptr) {
     EVP_PKEY_free(publicKey);
-    throw XmlError("xmlsec1 does not take the certificate's key: " + TakeXmlSecErrors());
+    throw XmlError("xmlsec1 does not accept the certificate's key: " + TakeXmlSecErrors());
   }
   XmlSecKeyHandle key(xmlSecKeyCreate());
   if (!key || xmlSecKeySetValue(key.get(), value) < 0) {
@@ -115,7 +115,8 @@ void VerifyPss(xmlNode* signature, X509* certificate, std::string_view certifica
     result.reason = "the signature value is wrong";
     return;
   }
-  // xmlsec1 judges the references under a method that it knows; its word on the value is moot.
+  // xmlsec1 verifies the references with a signature method that it supports; its result for the
+  // signature value is ignored.
   SetSignatureMethod(signature, UriOf(SignatureAlgorithm::RsaSha256));
   const SignatureContextHandle context = VerifyingContext(certificate);
   if (xmlSecDSigCtxVerify(context.get(), signature) < 0) {
@@ -181,7 +182,7 @@ std::string SignXml(std::string_view xml, std::string_view keyPem, std::string_v
     SignWithXmlSec(signature, keyPem, certificatePem);
     return WriteXml(document.get());
   }
-  // xmlsec1 fills in digests and KeyInfo; its signature value is replaced.
+  // xmlsec1 fills in the digests and KeyInfo; its signature value is then replaced.
   SetSignatureMethod(signature, UriOf(SignatureAlgorithm::RsaSha256));
   SignWithXmlSec(signature, keyPem, certificatePem);
   SetSignatureMethod(signature, method.c_str());

@@ -9,8 +9,8 @@
 
 namespace DevSts {
 
-// Verifies this signature in its document, whose ids are registered. The document is spent
-// afterwards: the signature's method may have been replaced.
+// Verifies this signature in its document, whose ids must be registered. The document must not be
+// used afterwards: the signature's method may have been replaced.
 VerifyResult VerifySignature(xmlNode* signature, std::string_view certificatePem);
 
 }  // namespace DevSts

@@ -16,14 +16,14 @@ struct DelegateEntry {
   Time instant;
 };
 
-// Under which conditions a token may be renewed.
+// The conditions under which a token may be renewed.
 struct RenewRestriction {
-  unsigned count = 0;  // 0: not any more
+  unsigned count = 0;  // 0: no more renewals
   bool postdatable = false;
   bool renewExpired = false;
 };
 
-// Everything that an assertion says.
+// The content of an assertion.
 struct TokenContent {
   std::string id;
   std::string issuer;
@@ -31,7 +31,7 @@ struct TokenContent {
   Time issued;
   Time notBefore;
   Time notOnOrAfter;
-  // PEM; makes the token a holder-of-key one.
+  // PEM; if present, the token is a holder-of-key token.
   std::optional<std::string> holderCertificatePem;
   std::optional<RenewRestriction> renewal;
   std::optional<unsigned> proxyCount;
@@ -43,10 +43,10 @@ struct TokenContent {
   std::string authenticationClass;
 };
 
-// Namespace declarations that assertions need, for the element that carries them.
+// The namespace declarations that an assertion needs.
 XmlWriter::Attributes AssertionNamespaces(const std::string& vendorHost);
 
-// An unsigned assertion (SAML 2.0 Core, section 2.3.3).
+// Writes an unsigned assertion (SAML 2.0 Core, section 2.3.3).
 std::string WriteAssertion(const TokenContent& content, const AssertionOptions& shape,
                            const std::string& vendorHost, const std::string& solutionHost);
 

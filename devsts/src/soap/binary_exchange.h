@@ -11,17 +11,17 @@ namespace DevSts {
 
 inline constexpr char kSpnegoValueType[] = "http://schemas.xmlsoap.org/ws/2005/02/trust/spnego";
 
-// What a client says in a negotiation (WS-Trust 1.3, section 8).
+// A client's leg of a negotiation (WS-Trust 1.3, section 8).
 struct NegotiationLeg {
   std::string context;
   Octets octets;
 };
 
-// Reads wst:BinaryExchange and the Context, which is the only attribute that the element around it
-// may have. Throws Fault.
+// Reads wst:BinaryExchange and the Context of `message`, which must not have other attributes.
+// Throws Fault.
 NegotiationLeg ReadLeg(xmlNode* message, xmlNode* binaryExchange);
 
-// wst:RequestSecurityTokenResponse with which a client goes on. Throws Fault.
+// Reads the wst:RequestSecurityTokenResponse that continues a negotiation. Throws Fault.
 NegotiationLeg ReadContinuedLeg(xmlNode* requestSecurityTokenResponse);
 
 }  // namespace DevSts

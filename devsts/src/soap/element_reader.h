@@ -18,11 +18,11 @@ struct AttributeName {
   const char* namespaceUri = nullptr;
 };
 
-// Reads the children of one element in the order that its schema gives. Whatever does not fit is an
-// InvalidRequest fault that names the place.
+// Reads the children of one element in the order of its schema. Throws an InvalidRequest fault that
+// names the place of the first mismatch.
 class ElementReader {
  public:
-  // Character data between the children may be white space only.
+  // Throws if there is text other than white space between the children.
   explicit ElementReader(xmlNode* element);
 
   // The next child, which must have this name.
@@ -30,7 +30,7 @@ class ElementReader {
   // The next child if it has this name, else null.
   xmlNode* Optional(const char* namespaceUri, const char* localName);
   bool AtEnd() const { return next_ == children_.size(); }
-  // Nothing may follow.
+  // Throws if there are more children.
   void End() const;
 
  private:
@@ -39,19 +39,19 @@ class ElementReader {
   std::size_t next_ = 0;
 };
 
-// Every attribute must be one of these and each of these must be there.
+// Throws unless the element has exactly these attributes.
 void RequireAttributes(const xmlNode* element, const std::vector<AttributeName>& names);
-// Text of an element that has neither child elements nor attributes.
+// The text of an element, which must have neither child elements nor attributes.
 std::string PlainText(const xmlNode* element);
-// Text of an element without child elements; its attributes are the caller's business.
+// The text of an element, which must not have child elements; attributes are not checked.
 std::string TextOf(const xmlNode* element);
-// PlainText that must be this: anything else is "Unsupported", by the element's name.
+// Throws unless PlainText(element) is the expected text: "Unsupported" and the element's name.
 void RequireText(const xmlNode* element, const std::string& expected);
-// The same for wst:RequestType, which says what the SOAPAction said.
+// The same for wst:RequestType, which must match the SOAPAction.
 void RequireRequestType(const xmlNode* element, const std::string& expected);
-// "true" or "false" in an element of plain text or an attribute.
+// The value of "true" or "false"; `place` names the element or attribute in the fault.
 bool BooleanOf(const std::string& text, const std::string& place);
-// wsu:Created and wsu:Expires of a Timestamp or Lifetime.
+// The wsu:Created and wsu:Expires of a Timestamp or Lifetime.
 std::pair<Time, Time> ReadPeriod(xmlNode* element);
 
 }  // namespace DevSts

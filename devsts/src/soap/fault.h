@@ -10,7 +10,7 @@
 
 namespace DevSts {
 
-// Ends the work on a request with a SOAP fault.
+// Thrown to answer a request with a SOAP fault.
 class Fault : public std::runtime_error {
  public:
   Fault(const char* codeNamespace, const char* codeName, const std::string& faultString)
@@ -22,17 +22,17 @@ class Fault : public std::runtime_error {
   const FaultAnswer& Answer() const { return *answer_; }
 
  private:
-  // Copied without failure, as an exception must be.
+  // Shared, because copying an exception must not fail.
   std::shared_ptr<const FaultAnswer> answer_;
 };
 
-// WS-Trust 1.3, section 11.
+// The faults of WS-Trust 1.3, section 11.
 [[noreturn]] void ThrowInvalidRequest(const std::string& faultString);
 [[noreturn]] void ThrowFailedAuthentication(const std::string& faultString);
 [[noreturn]] void ThrowRequestFailed(const std::string& faultString);
 [[noreturn]] void ThrowInvalidTimeRange(const std::string& faultString);
 [[noreturn]] void ThrowUnableToRenew(const std::string& faultString);
-// WS-Security 1.1, section 12.
+// The faults of WS-Security 1.1, section 12.
 [[noreturn]] void ThrowInvalidSecurity(const std::string& faultString);
 [[noreturn]] void ThrowInvalidSecurityToken(const std::string& faultString);
 [[noreturn]] void ThrowUnsupportedAlgorithm(const std::string& faultString);

@@ -37,7 +37,7 @@ std::string CertificateOfToken(const xmlNode* token) {
   try {
     return CertificateFromBase64(TextOf(token));
   } catch (const std::runtime_error& error) {
-    ThrowInvalidSecurityToken(std::string("The BinarySecurityToken holds no certificate: ") +
+    ThrowInvalidSecurityToken(std::string("The BinarySecurityToken contains no certificate: ") +
                               error.what());
   }
 }
@@ -54,7 +54,7 @@ std::string CertificateByReference(xmlNode* securityTokenReference, const Securi
     ThrowInvalidSecurity("The signature refers to a BinarySecurityToken, but there is none");
   }
   if (header.assertion != nullptr) {
-    ThrowInvalidSecurity("An assertion is not expected beside a BinarySecurityToken");
+    ThrowInvalidSecurity("An assertion is not expected together with a BinarySecurityToken");
   }
   return CertificateOfToken(header.certificateToken);
 }

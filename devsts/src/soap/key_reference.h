@@ -8,12 +8,11 @@
 
 namespace DevSts {
 
-// The form of what ds:KeyInfo refers to, without a look at whether it is right; None if there is no
-// signature.
+// The form of the reference in ds:KeyInfo, which is not checked; None if there is no signature.
 RequestSignature SignatureFormOf(const SecurityHeader& header);
 
-// PEM of the certificate whose key the signature's KeyInfo names: that of the header's
-// BinarySecurityToken (X.509 Token Profile 1.1, section 3.2), or of the holder of the header's
+// The certificate, as PEM, whose key the signature's KeyInfo names: the one in the header's
+// BinarySecurityToken (X.509 Token Profile 1.1, section 3.2), or the holder's in the header's
 // assertion (SAML Token Profile 1.1, section 3.4). Throws Fault.
 std::string CertificateOfSignature(const SecurityHeader& header);
 

@@ -13,7 +13,7 @@ namespace {
 
 constexpr char kHolderOfKey[] = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 
-// Reads one assertion, naming it in every fault.
+// Reads one assertion. Every fault names it.
 class TokenReader {
  public:
   TokenReader(xmlNode* assertion, const std::string& place)
@@ -46,7 +46,7 @@ class TokenReader {
     } catch (const Fault&) {
       throw;
     } catch (const std::runtime_error& error) {
-      ThrowInvalidSecurityToken(place_ + " holds no certificate: " + error.what());
+      ThrowInvalidSecurityToken(place_ + " contains no certificate: " + error.what());
     }
   }
 

@@ -11,7 +11,7 @@
 
 namespace DevSts {
 
-// What an assertion that somebody presents says about itself.
+// The content of an assertion that a client presents.
 struct PresentedToken {
   std::string id;
   std::string subject;
@@ -22,16 +22,16 @@ struct PresentedToken {
   unsigned proxyCount = 0;                          // 0: not delegable
   std::optional<RenewRestriction> renewal;
 
-  // The one who may use the token: the last delegate, else the subject.
+  // The principal that may use the token: the last delegate, else the subject.
   const std::string& Bearer() const { return delegates.empty() ? subject : delegates.back().name; }
 };
 
-// Reads an assertion; `place` names it in faults ("The ActAs token"). Says nothing of whether the
-// token is to be believed. Throws Fault.
+// Reads an assertion; `place` names it in faults ("The ActAs token"). Does not check whether the
+// token is valid. Throws Fault.
 PresentedToken ReadPresentedToken(xmlNode* assertion, const std::string& place);
 
-// PEM of the certificate that SubjectConfirmationData names (SAML 2.0 Profiles, section 3.1).
-// Throws Fault if the assertion is not a holder-of-key one.
+// The certificate, as PEM, in SubjectConfirmationData (SAML 2.0 Profiles, section 3.1). Throws
+// Fault if the assertion is not a holder-of-key token.
 std::string HolderCertificateOf(xmlNode* assertion, const std::string& place);
 
 }  // namespace DevSts

@@ -24,7 +24,7 @@ void RequireAlgorithm(xmlNode* element, const char* uri) {
   }
 }
 
-// No parameters of any algorithm are taken, so none of these may have children.
+// Algorithm parameters are not accepted, so the elements must not have children.
 void RequireExclusiveTransform(xmlNode* transforms) {
   RequireAttributes(transforms, {});
   ElementReader reader(transforms);
@@ -62,9 +62,9 @@ void RequireSignedInfo(xmlNode* signedInfo, const std::string& bodyId,
   }
 }
 
-// Requires that the signature is laid out as a request's must be: RSA-SHA256 over exclusive
-// canonical form, with one reference to each of these ids, in this order, each by SHA-256 over
-// exclusive canonical form alone. Nothing is verified.
+// Throws unless the signature has the layout that requests must use: RSA-SHA256 over exclusive
+// canonical form, with one reference to each of these ids, in this order, and only SHA-256 over
+// exclusive canonical form in each reference. Verifies no values.
 void RequireSignatureLayout(xmlNode* signature, const std::string& bodyId,
                             const std::string& timestampId) {
   RequireAttributes(signature, {{"Id"}});
@@ -78,7 +78,7 @@ void RequireSignatureLayout(xmlNode* signature, const std::string& bodyId,
   reader.End();
 }
 
-void RequireNothingOfASignature(const SoapRequest& request, const SecurityHeader& header) {
+void RequireNoSignatureParts(const SoapRequest& request, const SecurityHeader& header) {
   RequireAttributes(request.body, {});
   RequireAttributes(header.timestamp, {});
   if (header.assertion != nullptr || header.certificateToken != nullptr) {
@@ -86,8 +86,8 @@ void RequireNothingOfASignature(const SoapRequest& request, const SecurityHeader
   }
 }
 
-// WS-Security 1.1, section 4.2: an xs:ID. Another text could be an expression where a reference to
-// it stands, and would be evaluated there.
+// WS-Security 1.1, section 4.2: an xs:ID. Any other text could be an XPointer expression, which
+// would be evaluated in the reference to it.
 std::string SignedIdOf(const xmlNode* element) {
   RequireAttributes(element, {{"Id", kWsuNamespace}});
   std::string id = AttributeOf(element, "Id", kWsuNamespace);
@@ -117,7 +117,7 @@ void RequireUsableCertificate(const std::string& certificatePem) {
 std::optional<KeyProof> CheckRequestSignature(const SoapRequest& request,
                                               const SecurityHeader& header) {
   if (header.signature == nullptr) {
-    RequireNothingOfASignature(request, header);
+    RequireNoSignatureParts(request, header);
     return std::nullopt;
   }
   RequireTenMinutes(header);

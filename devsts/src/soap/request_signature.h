@@ -10,18 +10,19 @@
 
 namespace DevSts {
 
-// The Id that a request's signature bears and that wst:UseKey names.
+// The Id of a request's signature, to which wst:UseKey refers.
 inline constexpr char kProofSignatureId[] = "holderOfKeyProofSignature";
 
-// The key that a request's sender was seen to hold.
+// The key whose possession the sender of a request has proved.
 struct KeyProof {
   RequestSignature form = RequestSignature::None;
   std::string certificatePem;
 };
 
-// Judges the request's signature: what it covers, by which algorithms, and that the key it names
-// made it. None for a request without one, which must not carry what belongs to one. Whether the
-// certificate is anybody's is the caller's business. Throws Fault.
+// Checks the request's signature: what it covers, its algorithms, and its value under the key that
+// it names. Returns nothing for a request without a signature, which must not contain the elements
+// and attributes that belong to one. Does not check whether a user has the certificate. Throws
+// Fault.
 std::optional<KeyProof> CheckRequestSignature(const SoapRequest& request,
                                               const SecurityHeader& header);
 

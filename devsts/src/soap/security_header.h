@@ -15,7 +15,7 @@ struct UserNameToken {
   std::string password;
 };
 
-// wsse:Security as it stands in a request. Nodes are owned by the request's document.
+// The content of a request's wsse:Security. The nodes are owned by the request's document.
 struct SecurityHeader {
   xmlNode* timestamp = nullptr;
   Time created;

@@ -10,16 +10,16 @@
 
 namespace DevSts {
 
-// A SOAP 1.1 envelope that carries a fault (section 4.4).
+// A SOAP 1.1 envelope that contains a fault (section 4.4).
 std::string WriteFaultEnvelope(const FaultAnswer& fault);
 
 // How an answer wraps its RequestSecurityTokenResponse (WS-Trust 1.3, sections 4.3 and 5).
 enum class TokenAnswer {
   Issued,   // in a RequestSecurityTokenResponseCollection
-  Renewed,  // alone
+  Renewed,  // without a collection
 };
 
-// What a service says in a negotiation (WS-Trust 1.3, section 8).
+// A service's leg of a negotiation (WS-Trust 1.3, section 8).
 struct ServerLeg {
   std::optional<std::string> context;
   std::optional<Octets> octets;
@@ -28,8 +28,8 @@ struct ServerLeg {
 // The envelope of an answer that asks for the next leg.
 std::string WriteLegEnvelope(const ServerLeg& leg);
 
-// The envelope of an answer around the assertion's markup, which is put in as it stands.
-// `declarations` go onto the envelope. `leg` is that of a negotiation that ends with it.
+// The envelope of an answer that contains the assertion's markup unchanged. `declarations` are
+// added to the envelope element. `leg` is the last leg of a negotiation, if there was one.
 std::string WriteTokenEnvelope(TokenAnswer kind, const std::string& assertion, Time created,
                                Time expires, const XmlWriter::Attributes& declarations, bool indent,
                                const ServerLeg& leg = {});

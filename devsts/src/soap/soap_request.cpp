@@ -30,7 +30,7 @@ DocumentHandle ParseEnvelope(const std::string& body) {
   }
 }
 
-// WS-Security 1.1, section 4.2: an id is unique in its document.
+// WS-Security 1.1, section 4.2: ids must be unique in the document.
 void RegisterUniqueIds(xmlDoc* document) {
   try {
     RegisterIds(document);

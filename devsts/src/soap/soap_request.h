@@ -8,7 +8,7 @@
 
 namespace DevSts {
 
-// A SOAP 1.1 request (sections 4 and 6): its envelope taken apart.
+// The parts of a SOAP 1.1 request (sections 4 and 6).
 struct SoapRequest {
   DocumentHandle document;
   xmlNode* header = nullptr;
@@ -16,12 +16,12 @@ struct SoapRequest {
   xmlNode* bodyEntry = nullptr;
 };
 
-// The action in the SOAPAction field's quotes, after the HTTP part of the request was looked at.
-// Throws Fault.
+// Checks the HTTP part of the request and returns the action without the quotes of the SOAPAction
+// field. Throws Fault.
 std::string ReadSoapAction(const ReceivedRequest& request);
 
-// The Body must hold a WS-Trust element of this name alone. The ids of the document are registered
-// with it afterwards. Throws Fault.
+// Parses the envelope, whose Body must contain only a WS-Trust element of this name, and registers
+// the ids of the document. Throws Fault.
 SoapRequest ReadEnvelope(const std::string& body, const char* entryName);
 
 }  // namespace DevSts

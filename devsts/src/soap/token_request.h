@@ -30,8 +30,8 @@ struct IssueRequest {
   xmlNode* actAs = nullptr;  // the assertion, owned by the request's document
   std::vector<std::string> audiences;
   std::vector<AdviceRequest> advice;
-  bool usesKey = false;  // wst:UseKey names the request's signature (WS-Trust 1.3, section 9.2)
-  std::optional<NegotiationLeg> leg;  // the first one of a negotiation
+  bool usesKey = false;  // wst:UseKey refers to the request's signature (WS-Trust 1.3, section 9.2)
+  std::optional<NegotiationLeg> leg;  // the first leg of a negotiation
 };
 
 // Throws Fault for anything missing, unknown or out of order.

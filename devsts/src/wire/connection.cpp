@@ -66,20 +66,21 @@ bool Connection::Handshake() {
 }
 
 std::size_t Connection::Read(char* data, std::size_t size) {
-  const long got = tls_ ? SSL_read(tls_.get(), data, AsInt(size)) : recv(socket_, data, size, 0);
+  const long received =
+      tls_ ? SSL_read(tls_.get(), data, AsInt(size)) : recv(socket_, data, size, 0);
   ERR_clear_error();
-  return got > 0 ? static_cast<std::size_t>(got) : 0;
+  return received > 0 ? static_cast<std::size_t>(received) : 0;
 }
 
 bool Connection::Write(std::string_view octets) {
   while (!octets.empty()) {
-    const long put = tls_ ? SSL_write(tls_.get(), octets.data(), AsInt(octets.size()))
-                          : send(socket_, octets.data(), octets.size(), MSG_NOSIGNAL);
+    const long sent = tls_ ? SSL_write(tls_.get(), octets.data(), AsInt(octets.size()))
+                           : send(socket_, octets.data(), octets.size(), MSG_NOSIGNAL);
     ERR_clear_error();
-    if (put <= 0) {
+    if (sent <= 0) {
       return false;
     }
-    octets.remove_prefix(static_cast<std::size_t>(put));
+    octets.remove_prefix(static_cast<std::size_t>(sent));
   }
   return true;
 }

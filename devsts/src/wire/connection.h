@@ -13,35 +13,37 @@
 
 namespace DevSts {
 
-// One accepted connection, with or without TLS. Used by one thread; `Abort` alone may be called by
-// others, and only before the object ends.
+// One accepted connection, with or without TLS. Used by one thread; only `Abort` may be called by
+// other threads, during the lifetime of the object.
 class Connection {
  public:
-  // To be called once for each context that connections are made with.
+  // Must be called once for each context that connections use.
   static void Prepare(SSL_CTX* tls);
 
-  // Takes the socket. `tls` may be null.
+  // Takes ownership of the socket. `tls` may be null.
   Connection(int socket, SSL_CTX* tls);
   ~Connection();
   Connection(const Connection&) = delete;
   Connection& operator=(const Connection&) = delete;
 
-  // True at once without TLS.
+  // Returns true at once without TLS.
   bool Handshake();
-  // Octets read, 0 at the end or on any error.
+  // Returns the number of octets read, 0 at the end or on any error.
   std::size_t Read(char* data, std::size_t size);
   bool Write(std::string_view octets);
-  // True when the peer has closed or `Abort` was called, false when the time has passed.
+  // Returns true when the peer has closed the connection or `Abort` was called, false after the
+  // time limit.
   bool WaitForEnd(std::optional<std::chrono::milliseconds> limit);
-  // Ends the sending side and waits a little for the peer, so that nothing sent is lost to a reset.
+  // Ends the sending side and waits a few seconds for the peer, so that a reset does not discard
+  // sent octets.
   void Finish(CutStyle style);
-  // Makes every call of the connection's thread return.
+  // Makes pending and later calls of the connection's thread return.
   void Abort();
 
   bool OverTls() const { return tls_ != nullptr; }
   bool SessionReused() const;
   std::string TlsVersion() const;
-  // The server_name extension as the peer sent it, also when it resumes a session.
+  // The server_name extension that the peer sent, also in a resumed session.
   const std::string& ServerName() const { return serverName_; }
   std::string PeerCertificatePem() const;
 

@@ -10,7 +10,7 @@
 namespace DevSts {
 namespace {
 
-// OpenSSL writes to sockets without a way to keep the signal away.
+// OpenSSL cannot be told to write to sockets without raising the signal.
 void BlockBrokenPipeSignal() {
   sigset_t signals;
   sigemptyset(&signals);
@@ -20,7 +20,7 @@ void BlockBrokenPipeSignal() {
 
 using Serve = std::function<void(Connection&, std::uint64_t id)>;
 
-// A test's hook that throws costs its connection, not the process.
+// A test's hook that throws ends its connection, not the process.
 void ServeQuietly(Connection& connection, std::uint64_t id, const Serve& serve) {
   try {
     serve(connection, id);
@@ -44,7 +44,7 @@ void ConnectionThreads::Start(int socket, SSL_CTX* tls,
   const std::uint64_t id = ++lastId_;
   auto made = std::make_unique<Connection>(socket, tls);
   Connection& connection = *made;
-  // The thread's first look at the map waits for this lock.
+  // The new thread accesses the map only after this lock is released.
   std::thread thread([this, id, &connection, serve, closed] {
     BlockBrokenPipeSignal();
     ServeQuietly(connection, id, serve);

@@ -14,7 +14,7 @@
 
 namespace DevSts {
 
-// One thread for each connection. Safe on any thread.
+// One thread for each connection. Thread-safe.
 class ConnectionThreads {
  public:
   ConnectionThreads() = default;
@@ -22,8 +22,8 @@ class ConnectionThreads {
   ConnectionThreads(const ConnectionThreads&) = delete;
   ConnectionThreads& operator=(const ConnectionThreads&) = delete;
 
-  // Runs `serve` with the connection on a new thread; then the connection is closed and `closed` is
-  // called. After `Stop` the socket is closed at once.
+  // Runs `serve` with the connection on a new thread, then closes the connection and calls
+  // `closed`. After `Stop`, closes the socket at once and calls `closed`.
   void Start(int socket, SSL_CTX* tls,
              const std::function<void(Connection&, std::uint64_t id)>& serve,
              const std::function<void()>& closed);

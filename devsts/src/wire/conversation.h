@@ -13,7 +13,7 @@
 
 namespace DevSts {
 
-// What every conversation shares.
+// What all conversations share.
 struct ConversationParts {
   Service& service;
   MisbehaviorPlan& plan;
@@ -21,7 +21,7 @@ struct ConversationParts {
   const std::function<void(const ReceivedRequest&)>& onRequest;
 };
 
-// One connection from its start to its end, on the calling thread.
+// Serves one connection from start to end on the calling thread.
 class Conversation {
  public:
   Conversation(Connection& connection, std::uint64_t id, ConversationParts parts)
@@ -33,12 +33,12 @@ class Conversation {
   bool Begin();
   bool ServeOne();
   SoapReply Decide(const ReceivedRequest& request, const Misbehavior& misbehavior) const;
-  // Fills in what the connection tells.
+  // Fills in the properties of the connection.
   void Describe(ReceivedRequest& request);
   void Record(ReceivedRequest& request, const SoapReply& reply, const WireAnswer& wire,
               const Misbehavior& misbehavior);
   void StallHere();
-  // False when the connection is over.
+  // Returns false if the connection has ended.
   bool Delay(std::chrono::milliseconds time);
   bool Send(const WireAnswer& wire, const Misbehavior& misbehavior);
   bool SendPaced(std::string_view octets, const std::optional<Drip>& drip);

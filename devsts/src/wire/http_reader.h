@@ -13,13 +13,14 @@ class HttpReader {
  public:
   enum class Outcome {
     Request,
-    End,        // the peer closed between requests
-    Malformed,  // not HTTP, too large, or cut off
+    End,        // the peer closed the connection between requests
+    Malformed,  // not HTTP, too large, or incomplete
   };
 
   explicit HttpReader(Connection& connection) : connection_(connection) {}
 
-  // Fills head, method, target, headers and body. `keepAlive` is what the request asks for.
+  // Fills in head, method, target, headers and body. `keepAlive` is set to what the request asks
+  // for.
   Outcome Next(ReceivedRequest& request, bool& keepAlive);
 
  private:

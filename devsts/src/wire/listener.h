@@ -8,10 +8,10 @@
 
 namespace DevSts {
 
-// A listening TCP socket with a thread that accepts.
+// A listening TCP socket with a thread that accepts connections.
 class Listener {
  public:
-  // `accept` gets each new socket, which it owns from then on. Throws std::runtime_error.
+  // `accept` takes ownership of each new socket. Throws std::runtime_error.
   Listener(const std::string& address, std::uint16_t port, std::function<void(int)> accept);
   ~Listener();
   Listener(const Listener&) = delete;

@@ -9,17 +9,17 @@
 
 namespace DevSts {
 
-// Which misbehaviour is due next. Safe on any thread.
+// The misbehaviour that is due next. Thread-safe.
 class MisbehaviorPlan {
  public:
   void Set(Misbehavior misbehavior);
-  // Forgets everything that was set or due.
+  // Forgets all misbehaviour that was set or is due.
   void Clear();
   void Next(Misbehavior misbehavior, std::size_t count);
 
-  // A stall that a new connection is to meet.
+  // The stall for a new connection.
   Stall TakeForConnection();
-  // What the next request is to meet.
+  // The misbehaviour for the next request.
   Misbehavior TakeForRequest();
 
  private:

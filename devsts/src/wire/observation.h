@@ -11,13 +11,13 @@
 
 namespace DevSts {
 
-// What was seen: the requests and the counters. Safe on any thread.
+// The log of requests and the counters. Thread-safe.
 class Observation {
  public:
   explicit Observation(std::size_t requestLimit) : requestLimit_(requestLimit) {}
 
   void Count(const std::function<void(Counters&)>& change);
-  // Remembers the request and changes the counters in one step.
+  // Logs the request and changes the counters in one step.
   void Add(const ReceivedRequest& request, const std::function<void(Counters&)>& change);
 
   std::vector<ReceivedRequest> Requests() const;

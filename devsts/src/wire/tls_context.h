@@ -6,10 +6,10 @@
 
 namespace DevSts {
 
-// The server's certificate and what is sent along with it.
+// The server's certificate and the rest of its chain.
 struct ServerIdentity {
   Credential credential;
-  std::string chainPem;  // an intermediate certificate, or nothing
+  std::string chainPem;  // the intermediate certificate that is sent, or empty
 };
 
 ServerIdentity MakeServerIdentity(const TlsOptions& options, const Credential& authority);

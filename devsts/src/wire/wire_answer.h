@@ -17,7 +17,8 @@ struct WireAnswer {
   bool closes = false;
 };
 
-// Shapes the reply as told. `keepAlive` is whether the connection could go on.
+// Writes the reply with the misbehaviour applied. `keepAlive`: whether the request allows the
+// connection to stay open.
 WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool keepAlive);
 
 }  // namespace DevSts

@@ -67,7 +67,8 @@ void InitializeXmlLibraries() {
     }
     xmlSecErrorsSetCallback(CollectXmlSecError);
   });
-  // The handler belongs to the thread: one that met libxml2 before has the default still.
+  // The handler is per thread: a thread that used libxml2 before the first call still has the
+  // default one.
   xmlSetGenericErrorFunc(nullptr, IgnoreMessage);
 }
 
@@ -84,7 +85,7 @@ DocumentHandle ParseXml(std::string_view text) {
   constexpr int kOptions = XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING;
   DocumentHandle document(xmlCtxtReadMemory(
       parser.get(), text.data(), static_cast<int>(text.size()), nullptr, nullptr, kOptions));
-  // Errors of namespace well-formedness leave a tree behind.
+  // libxml2 returns a tree even if only the namespaces are not well-formed.
   if (!document || parser->wellFormed == 0 || parser->nsWellFormed == 0) {
     throw XmlError(LastParseError(parser.get()));
   }

@@ -22,14 +22,15 @@ struct FreeXmlString {
 };
 using XmlString = std::unique_ptr<xmlChar, FreeXmlString>;
 
-// Makes libxml2 and xmlsec1 ready; the first call does, on any thread.
+// Initialises libxml2 and xmlsec1 on the first call, from any thread.
 void InitializeXmlLibraries();
 
-// What xmlsec1 complained about on this thread since the last call, the root of the trouble first.
+// Takes the errors that xmlsec1 has reported on this thread since the last call, the root cause
+// first.
 std::string TakeXmlSecErrors();
 
-// Parses a document without a document type and without any I/O. Throws XmlError with line and
-// reason.
+// Parses a document, which must not have a document type, without any I/O. Throws XmlError with the
+// line and the reason.
 DocumentHandle ParseXml(std::string_view text);
 
 // The document as libxml2 writes it, without a declaration.
@@ -41,27 +42,27 @@ std::string_view LocalName(const xmlNode* node);
 std::string_view NamespaceUri(const xmlNode* node);
 bool IsElement(const xmlNode* node, std::string_view namespaceUri, std::string_view localName);
 
-// Text of the element's whole content.
+// The text of the element and its descendants.
 std::string ContentOf(const xmlNode* node);
 
-// Attribute without a namespace, or of the given one; empty if absent.
+// The value of the attribute without a namespace, or in the given one; empty if absent.
 std::string AttributeOf(const xmlNode* element, const char* name, const char* uri = nullptr);
 bool HasAttribute(const xmlNode* element, const char* name, const char* uri = nullptr);
 
 // The child elements in document order.
 std::vector<xmlNode*> ChildElements(const xmlNode* element);
 
-// The next element in document order, the descendants first; null at the end of `root`.
+// The next element in document order, descendants included; null after the last one in `root`.
 xmlNode* NextElement(const xmlNode* root, xmlNode* node);
 
-// The elements below (and including) `root` of this name.
+// The elements of this name among `root` and its descendants.
 std::vector<xmlNode*> FindElements(xmlNode* root, std::string_view namespaceUri,
                                    std::string_view localName);
 
-// The value of an attribute that names an element: ID, Id, AssertionID or wsu:Id; empty if none.
+// The value of the element's id attribute (ID, Id, AssertionID or wsu:Id); empty if there is none.
 std::string IdOf(const xmlNode* element);
 
-// Makes every such attribute known to the document, so that references find it.
+// Registers every such attribute with the document, so that references find the elements.
 void RegisterIds(xmlDoc* document);
 
 }  // namespace DevSts

@@ -79,7 +79,7 @@ std::string TimeToText(Time time) {
 }
 
 std::optional<Time> TimeFromText(std::string_view text) {
-  // Never destroyed: a server may still answer while the process's static objects die.
+  // Never destroyed: a server may still answer while the process destroys its static objects.
   static const std::regex& kForm =
       *new std::regex(R"((\d{4})-(\d\d)-(\d\d)T(\d\d):(\d\d):(\d\d)(?:\.(\d+))?(Z|[+-]\d\d:\d\d))");
   std::match_results<std::string_view::const_iterator> match;

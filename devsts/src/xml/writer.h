@@ -8,10 +8,10 @@
 
 namespace DevSts {
 
-// Text with the characters escaped that XML 1.0 reserves; right for content and attribute values.
+// Escapes the characters that XML 1.0 reserves, for element content as well as attribute values.
 std::string EscapeXml(std::string_view text);
 
-// Writes elements one after another into a text.
+// Writes elements to a text in document order.
 class XmlWriter {
  public:
   using Attributes = std::vector<std::pair<std::string, std::string>>;
@@ -20,10 +20,10 @@ class XmlWriter {
 
   void Open(const std::string& name, const Attributes& attributes = {});
   void Close();
-  // An element with text only, or an empty one.
+  // An element that contains only text, or nothing.
   void Leaf(const std::string& name, const Attributes& attributes, std::string_view text);
   void Leaf(const std::string& name, std::string_view text) { Leaf(name, {}, text); }
-  // Markup as it is.
+  // Appends markup unchanged.
   void Raw(std::string_view markup) { text_ += markup; }
 
   const std::string& Text() const { return text_; }
