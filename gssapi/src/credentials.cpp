@@ -39,7 +39,7 @@ void Acquire(const CredentialSource& source, const GssName& principal, gss_OID m
   CheckGssStatus(kAttempt, status);
 }
 
-// The calls that look into one keytab.
+// The calls that read one keytab.
 class KeytabReader {
  public:
   explicit KeytabReader(const std::string& name) : name_(name), context_(CreateKrb5Context()) {
@@ -91,7 +91,7 @@ void ImportGssName(const std::string& text, gss_OID type, GssName& name) {
 
 MemoryCache::MemoryCache() : name_("MEMORY:" + Tarnik::StringUtil::GenerateUuid()) {}
 
-// GSSAPI makes the cache when it first has tickets to keep, but has no call that destroys it.
+// GSSAPI creates the cache when it first stores tickets, but has no call that destroys it.
 MemoryCache::~MemoryCache() {
   const auto context = CreateKrb5Context();
   krb5_ccache cache = nullptr;
@@ -116,7 +116,7 @@ gss_OID SpnegoMechanism() noexcept {
 }
 
 void AcquireCredentials(const CredentialSource& source, GssCredential& credentials) {
-  // GSSAPI does not tell what is wrong with a keytab.
+  // GSSAPI does not report what is wrong with a keytab.
   if (!source.keytab.empty()) {
     CheckKeytab(source.keytab, source.principal);
   }
@@ -124,7 +124,7 @@ void AcquireCredentials(const CredentialSource& source, GssCredential& credentia
   if (!source.principal.empty()) {
     ImportGssName(source.principal, GSS_C_NT_USER_NAME, principal);
   }
-  // SPNEGO does not tell why Kerberos has none.
+  // SPNEGO does not report why Kerberos has no credentials.
   GssCredential sample;
   Acquire(source, principal, gss_mech_krb5, sample);
   Acquire(source, principal, SpnegoMechanism(), credentials);

@@ -9,12 +9,11 @@
 
 namespace SsoClient {
 
-/// Reads `text` as a name of the given type (RFC 2744, section 3.10) into `name`. Throws
-/// `SsoException` when the library cannot.
+/// Parses `text` as a name of the given type (RFC 2744, section 3.10) into `name`. Throws
+/// `SsoException` if the library cannot parse it.
 void ImportGssName(const std::string& text, gss_OID type, GssName& name);
 
-/// A credential cache in memory, under a name that nobody else uses. Its tickets are destroyed with
-/// it.
+/// A credential cache in memory with a unique name. The destructor destroys its tickets.
 class MemoryCache {
  public:
   MemoryCache();
@@ -28,22 +27,22 @@ class MemoryCache {
   std::string name_;
 };
 
-/// Throws `SsoException`, with the text of the Kerberos library, when the keytab cannot be read or
-/// holds no key: of `principal`, unless that is empty.
+/// Throws `SsoException`, with the text of the Kerberos library, if the keytab cannot be read or
+/// has no key of `principal`, or no key at all if `principal` is empty.
 void CheckKeytab(const std::string& keytab, const std::string& principal);
 
 /// The object identifier of SPNEGO (RFC 4178, section 3).
 gss_OID SpnegoMechanism() noexcept;
 
-/// Where credentials come from; what is empty is left to the library.
+/// Where credentials come from. The library chooses what is empty.
 struct CredentialSource {
   std::string principal;
   std::string keytab;
   std::string cache;
 };
 
-/// Credentials to initiate with, by SPNEGO with nothing but Kerberos in it: no other mechanism
-/// proves the service's identity. Throws `SsoException`.
+/// Acquires credentials to initiate a negotiation with SPNEGO. They are restricted to Kerberos,
+/// because no other mechanism proves the service's identity. Throws `SsoException`.
 void AcquireCredentials(const CredentialSource& source, GssCredential& credentials);
 
 }  // namespace SsoClient

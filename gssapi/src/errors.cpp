@@ -17,7 +17,7 @@ bool IsBetween(char c, unsigned char first, unsigned char last) {
   return first <= byte && byte <= last;
 }
 
-std::size_t LengthBehind(char lead) {
+std::size_t LengthFor(char lead) {
   if (IsBetween(lead, 0, 0x7f)) {
     return 1;
   }
@@ -30,7 +30,7 @@ std::size_t LengthBehind(char lead) {
   return IsBetween(lead, 0xf0, 0xf4) ? 4 : 0;
 }
 
-// What could be written in fewer bytes, stands for half of a pair, or lies beyond Unicode.
+// Overlong forms, surrogates, and values beyond Unicode.
 bool IsForbidden(char lead, char second) {
   return (lead == '\xe0' && IsBetween(second, 0x80, 0x9f)) ||
          (lead == '\xed' && IsBetween(second, 0xa0, 0xbf)) ||
@@ -38,10 +38,11 @@ bool IsForbidden(char lead, char second) {
          (lead == '\xf4' && IsBetween(second, 0x90, 0xbf));
 }
 
-// The character of UTF-8 (RFC 3629, section 4) that the text begins with; empty if there is none.
+// The first character of the text in UTF-8 (RFC 3629, section 4); empty if the text does not begin
+// with a valid one.
 std::string_view FirstCharacter(std::string_view text) {
-  const std::string_view character = text.substr(0, LengthBehind(text.front()));
-  if (character.size() < LengthBehind(text.front())) {
+  const std::string_view character = text.substr(0, LengthFor(text.front()));
+  if (character.size() < LengthFor(text.front())) {
     return {};
   }
   for (const char c : character.substr(character.empty() ? 0 : 1)) {

@@ -24,10 +24,10 @@ using Leg = std::vector<unsigned char>;
 // Integrity lets SPNEGO protect the choice of the mechanism (RFC 4178, section 5).
 constexpr OM_uint32 kFlags = GSS_C_MUTUAL_FLAG | GSS_C_INTEG_FLAG;
 
-// Kerberos takes three at most. A service that asks on and on would hold its caller forever.
+// Kerberos takes at most three. A service that never ends would block its caller forever.
 constexpr int kMaxLegs = 100;
 
-// One thread at a time: two would tear the negotiation apart.
+// Only one thread at a time may work on a negotiation.
 class Use {
  public:
   explicit Use(std::atomic_flag& isInUse) : isInUse_(isInUse) {
@@ -48,7 +48,7 @@ Leg BytesOf(const GssBuffer& buffer) {
   return {bytes, bytes + buffer.Get().length};
 }
 
-// A leg that logs its maker in does not stay in memory when its last owner lets go of it.
+// A leg authenticates its sender, so its memory is cleared when its last owner releases it.
 std::shared_ptr<const Leg> HandOut(Leg leg) {
   return {new Leg(std::move(leg)), [](Leg* handedOut) {
             Tarnik::StringUtil::Cleanse(*handedOut);
@@ -62,7 +62,7 @@ void Require(bool condition, const std::string& demand) {
   }
 }
 
-// A principal's own form, "service/host@REALM", would be taken for something else.
+// The library would misinterpret a principal in its own form, "service/host@REALM".
 bool IsServiceAtHost(const std::string& name) {
   const auto at = name.find('@');
   return at != std::string::npos && at != 0 && at + 1 != name.size() && name.rfind('@') == at &&
@@ -71,7 +71,7 @@ bool IsServiceAtHost(const std::string& name) {
 
 void RequireNoNul(const std::string& text, const char* field) {
   Require(text.find('\0') == std::string::npos,
-          std::string("the ") + field + " must not hold a NUL.");
+          std::string("the ") + field + " must not contain a NUL.");
 }
 
 }  // namespace
@@ -92,12 +92,12 @@ std::shared_ptr<const Leg> GssapiNegotiationHandlerImpl::Negotiate(const Leg& se
   }
   if (state_ == State::kIdle) {
     throw Tarnik::InvalidStateException(
-        "The negotiation handler is given a leg of the service's, but no negotiation is under "
-        "way.");
+        "The negotiation handler was given a leg of the service, but no negotiation is in "
+        "progress.");
   }
   try {
     CountLeg();
-    // The service may send a leg even when all is said.
+    // The service may send a leg even after the negotiation is complete.
     if (state_ == State::kEstablished) {
       return std::make_shared<const Leg>();
     }
@@ -115,7 +115,7 @@ bool GssapiNegotiationHandlerImpl::IsEstablished() const {
 void GssapiNegotiationHandlerImpl::Begin() {
   End(State::kIdle);
   AcquireCredentials(source_, credentials_);
-  state_ = State::kUnderWay;
+  state_ = State::kInProgress;
   legs_ = 0;
 }
 
@@ -130,7 +130,7 @@ std::string GssapiNegotiationHandlerImpl::Attempt() const {
   return "The login at `" + targetService_ + "' failed";
 }
 
-// No message will be protected with the context's keys: they need not be kept.
+// No messages will be protected with the context's keys, so they need not be kept.
 void GssapiNegotiationHandlerImpl::End(State state) noexcept {
   context_.Reset();
   credentials_.Reset();
@@ -149,7 +149,7 @@ Leg GssapiNegotiationHandlerImpl::NextLeg(const Leg& serverLeg) {
       output.Address(), &granted, nullptr);
   CheckGssStatus(attempt, status);
   if ((status.major & GSS_S_CONTINUE_NEEDED) != 0) {
-    // Both sides would wait for each other.
+    // Otherwise both sides would wait for each other.
     if (output.Get().length == 0) {
       throw SsoException(attempt + ": it is not complete, but there is nothing to send.");
     }

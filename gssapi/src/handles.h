@@ -10,7 +10,7 @@
 
 namespace SsoClient {
 
-/// A handle or buffer of the GSSAPI library, released when it dies.
+/// A handle or buffer of the GSSAPI library, released by the destructor.
 template <class Handle, OM_uint32 (*kRelease)(OM_uint32*, Handle*)>
 class GssHandle {
  public:
@@ -20,7 +20,7 @@ class GssHandle {
   ~GssHandle() { Reset(); }
 
   const Handle& Get() const noexcept { return handle_; }
-  /// For the calls that fill or change the handle.
+  /// For calls that set or change the handle.
   Handle* Address() noexcept { return &handle_; }
   void Reset() noexcept {
     OM_uint32 minor = 0;
@@ -36,7 +36,7 @@ inline OM_uint32 DeleteContext(OM_uint32* minor, gss_ctx_id_t* context) {
   return gss_delete_sec_context(minor, context, GSS_C_NO_BUFFER);
 }
 
-// Most hold what logs somebody in.
+// Most buffers contain data that authenticates a client.
 inline OM_uint32 ReleaseCleansed(OM_uint32* minor, gss_buffer_t buffer) {
   if (buffer->value != nullptr) {
     explicit_bzero(buffer->value, buffer->length);
@@ -54,7 +54,7 @@ struct Krb5ContextDeleter {
 };
 using Krb5Context = std::unique_ptr<std::remove_pointer_t<krb5_context>, Krb5ContextDeleter>;
 
-/// Frees what belongs to a context, which has to live longer.
+/// Frees an object that belongs to a context, which must outlive it.
 template <class Object, auto kFree>
 struct Krb5Deleter {
   krb5_context context;
@@ -65,7 +65,7 @@ using Krb5Keytab =
 using Krb5Principal = std::unique_ptr<std::remove_pointer_t<krb5_principal>,
                                       Krb5Deleter<krb5_principal, krb5_free_principal>>;
 
-/// Null when the Kerberos library cannot read its configuration.
+/// Returns null if the Kerberos library cannot read its configuration.
 inline Krb5Context CreateKrb5Context() noexcept {
   krb5_context context = nullptr;
   return Krb5Context(krb5_init_context(&context) == 0 ? context : nullptr);

@@ -21,7 +21,7 @@ namespace {
 using TestSupport::ThrownMessage;
 using namespace std::chrono_literals;
 
-// Credentials are judged by whom a service sees log in with them.
+// Tests credentials by the client that a service sees log in with them.
 class GssCredentialsTest : public RealmFixture {
  protected:
   static void ExpectLogin(const GssapiNegotiationConfig& config, const std::string& client) {
@@ -36,7 +36,7 @@ class GssCredentialsTest : public RealmFixture {
     });
   }
 
-  // "FILE:PATH" without its kind.
+  // The path in "FILE:PATH".
   static std::string PathOf(const std::string& cache) { return cache.substr(5); }
 
   static constexpr char kNone[] =
@@ -112,7 +112,7 @@ TEST_F(GssCredentialsTest, AreNotThoseOfAnotherPrincipal) {
       std::string(kNone) + "(Can't find client principal bob@EXAMPLE.COM in cache collection).");
 }
 
-TEST_F(GssCredentialsTest, TellWhyThereAreNone) {
+TEST_F(GssCredentialsTest, SayWhyThereAreNone) {
   EXPECT_EQ(Complaint({"", "", ""}),
             std::string(kNone) +
                 "(No Kerberos credentials available (default cache: FILE:/nonexistent/cache)).");
@@ -125,13 +125,13 @@ TEST_F(GssCredentialsTest, TellWhyThereAreNone) {
             "'/nonexistent/keytab' not found.");
 }
 
-TEST_F(GssCredentialsTest, TellThatANameIsNone) {
+TEST_F(GssCredentialsTest, SayThatANameIsInvalid) {
   EXPECT_EQ(Complaint({"a@b@c", "", realm->Login("alice", "secret")}),
             "There are no credentials to log in with: An invalid name was supplied (Malformed "
             "representation of principal).");
 }
 
-TEST_F(GssCredentialsTest, TellThatTheRealmKnowsNoKeyOfTheKeytab) {
+TEST_F(GssCredentialsTest, SayThatTheRealmDoesNotKnowTheKeyOfAKeytab) {
   DevSts::KerberosRealm other;
   const std::string keytab = other.AddKeytab("stranger");
   EXPECT_EQ(Complaint({"stranger", keytab, "MEMORY:stranger"}),
@@ -153,7 +153,7 @@ TEST_F(KeytabCheckTest, AcceptsAKeytabWithAFittingKey) {
   EXPECT_NO_THROW(CheckKeytab("FILE:" + machineKeytab, "machine@EXAMPLE.COM"));
 }
 
-TEST_F(KeytabCheckTest, TellsThatThereIsNone) {
+TEST_F(KeytabCheckTest, ReportsAMissingKeytab) {
   EXPECT_EQ(Complaint("/nonexistent/keytab", "machine"),
             "The keytab `/nonexistent/keytab' cannot be used: Key table file "
             "'/nonexistent/keytab' not found.");
@@ -162,19 +162,19 @@ TEST_F(KeytabCheckTest, TellsThatThereIsNone) {
             "nonexistent or empty.");
 }
 
-TEST_F(KeytabCheckTest, TellsThatThePrincipalHasNoKeyInIt) {
+TEST_F(KeytabCheckTest, ReportsAPrincipalWithoutAKey) {
   EXPECT_EQ(Complaint(machineKeytab, "bob"), "The keytab `" + machineKeytab +
                                                  "' cannot be used: No key table entry found for "
                                                  "bob@EXAMPLE.COM.");
 }
 
-TEST_F(KeytabCheckTest, TellsThatAFileIsNoKeytab) {
+TEST_F(KeytabCheckTest, ReportsAFileThatIsNotAKeytab) {
   EXPECT_EQ(Complaint(realm->ConfigPath(), "machine"),
             "The keytab `" + realm->ConfigPath() +
                 "' cannot be used: Unsupported key table format version number.");
 }
 
-TEST_F(KeytabCheckTest, TellsThatANameIsNone) {
+TEST_F(KeytabCheckTest, ReportsInvalidNames) {
   EXPECT_EQ(
       Complaint(machineKeytab, "a@b@c"),
       "The keytab `" + machineKeytab + "' cannot be used: Malformed representation of principal.");
@@ -197,7 +197,7 @@ bool HasOwner(const Krb5Context& context, const std::string& name) {
   return hasOwner;
 }
 
-TEST(MemoryCacheTest, DestroysWhatIsInIt) {
+TEST(MemoryCacheTest, DestroysItsTickets) {
   const auto context = CreateKrb5Context();
   ASSERT_NE(context, nullptr);
   std::string name;
@@ -215,7 +215,7 @@ TEST(MemoryCacheTest, DestroysWhatIsInIt) {
   EXPECT_FALSE(HasOwner(context, name));
 }
 
-TEST(MemoryCacheTest, BelongsToItsOwnerAlone) {
+TEST(MemoryCacheTest, HasAUniqueName) {
   const MemoryCache one;
   const MemoryCache other;
   EXPECT_EQ(one.Name().rfind("MEMORY:", 0), 0U);

@@ -23,24 +23,24 @@ std::string MessageOf(const GssStatus& status) {
 TEST(GssErrorTest, LetsSuccessPass) {
   EXPECT_NO_THROW(CheckGssStatus("The attempt failed", {}));
   EXPECT_NO_THROW(CheckGssStatus("The attempt failed", {GSS_S_CONTINUE_NEEDED, 0}));
-  // Some calls leave a minor code behind when all is well.
+  // Some calls set a minor code even if they succeed.
   EXPECT_NO_THROW(CheckGssStatus("The attempt failed", {GSS_S_COMPLETE, 22}));
 }
 
-TEST(GssErrorTest, TellsTheMajorCodeAlone) {
+TEST(GssErrorTest, ReportsOnlyTheMajorCode) {
   EXPECT_EQ(MessageOf({GSS_S_NO_CRED, 0}),
             "The attempt failed: No credentials were supplied, or the credentials were unavailable "
             "or inaccessible.");
 }
 
-TEST(GssErrorTest, TellsBothPartsOfAMajorCode) {
+TEST(GssErrorTest, ReportsBothPartsOfAMajorCode) {
   EXPECT_EQ(
       MessageOf({GSS_S_CALL_BAD_STRUCTURE | GSS_S_BAD_MECH, 0}),
       "The attempt failed: A parameter was malformed, An unsupported mechanism was requested.");
 }
 
 // The library's own text ends in a blank and a NUL.
-TEST(GssErrorTest, TellsTheMinorCodeWithoutWhatIsNotText) {
+TEST(GssErrorTest, ReportsTheMinorCodeWithoutTrailingBlanksAndNuls) {
   GssCredential credentials;
   gss_OID_set_desc mechanisms{1, SpnegoMechanism()};
   GssStatus status;
@@ -56,19 +56,19 @@ TEST(GssErrorTest, TellsTheMinorCodeWithoutWhatIsNotText) {
             "negotiate).");
 }
 
-TEST(PlainTextTest, LeavesTextAsItIs) {
+TEST(PlainTextTest, LeavesTextUnchanged) {
   EXPECT_EQ(PlainText(""), "");
   EXPECT_EQ(PlainText("Ticket expired"), "Ticket expired");
   EXPECT_EQ(PlainText("Jeton expiré"), "Jeton expiré");
 }
 
-TEST(PlainTextTest, DropsWhatATextEndsIn) {
+TEST(PlainTextTest, DropsTrailingBlanksAndControlCharacters) {
   EXPECT_EQ(PlainText(std::string_view("no token \0", 10)), "no token");
   EXPECT_EQ(PlainText(" two lines\r\n\n"), " two lines");
   EXPECT_EQ(PlainText(" \n "), "");
 }
 
-TEST(PlainTextTest, StaysInOneLine) {
+TEST(PlainTextTest, StaysOnOneLine) {
   EXPECT_EQ(PlainText(std::string_view("a\nb\x1b[1mc\0d\x7f!", 12)), "a?b?[1mc?d?!");
 }
 
@@ -77,7 +77,7 @@ TEST(PlainTextTest, IsUtf8) {
                                  "\xee\x80\x80", "\xf0\x90\x80\x80", "\xf4\x8f\xbf\xbf"}) {
     EXPECT_EQ(PlainText("a" + kept + "b"), "a" + kept + "b");
     EXPECT_EQ(PlainText(kept), kept);
-    // What is left of it is not.
+    // Its incomplete beginnings are not.
     for (std::size_t size = 1; size < kept.size(); ++size) {
       EXPECT_EQ(PlainText("a" + kept.substr(0, size) + "b"), "a" + std::string(size, '?') + "b");
       EXPECT_EQ(PlainText(kept.substr(0, size)), std::string(size, '?'));
@@ -90,7 +90,7 @@ TEST(PlainTextTest, IsUtf8) {
   }
 }
 
-TEST(PlainTextTest, HoldsNoControlCharacterOfTwoBytes) {
+TEST(PlainTextTest, ContainsNoTwoByteControlCharacters) {
   EXPECT_EQ(PlainText("a\xc2\x9b[1mb\xc2\x80"), "a?[1mb?");
 }
 

@@ -20,7 +20,7 @@ std::string TextOf(const GssName& name) {
 
 }  // namespace
 
-// Without a replay cache, which would be a file that all tests share.
+// Uses no replay cache, which would be a file that all tests share.
 GssAcceptor::GssAcceptor(const std::string& keytab) {
   gss_key_value_element_desc elements[] = {{"keytab", keytab.c_str()}, {"rcache", "none:"}};
   const gss_key_value_set_desc store{2, elements};

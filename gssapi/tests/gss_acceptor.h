@@ -14,10 +14,10 @@ namespace SsoClient::Testing {
 /// The service's side of one negotiation.
 class GssAcceptor {
  public:
-  /// Throws `SsoException` when the keytab has no keys.
+  /// Throws `SsoException` if the keytab has no keys.
   explicit GssAcceptor(const std::string& keytab);
 
-  /// The service's leg, which is the refusal when `error` is not empty afterwards.
+  /// Returns the service's leg, which is a refusal if `error` is not empty afterwards.
   std::vector<unsigned char> Accept(const std::vector<unsigned char>& leg);
 
   bool isEstablished = false;

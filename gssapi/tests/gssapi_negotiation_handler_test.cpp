@@ -36,7 +36,7 @@ using Leg = std::vector<unsigned char>;
 
 constexpr char kAlice[] = "alice@EXAMPLE.COM";
 constexpr char kNoNegotiation[] =
-    "The negotiation handler is given a leg of the service's, but no negotiation is under way.";
+    "The negotiation handler was given a leg of the service, but no negotiation is in progress.";
 
 std::string Failed(const std::string& major, const std::string& minor) {
   return "The login at `HTTP@sts.example' failed: " + major + " (" + minor + ").";
@@ -46,7 +46,7 @@ std::string Failed(const std::string& minor) {
   return Failed("Unspecified GSS failure.  Minor code may provide more information", minor);
 }
 
-// NegTokenResp (RFC 4178, section 4.2.2) for Kerberos without a leg of Kerberos's own.
+// A NegTokenResp (RFC 4178, section 4.2.2) for Kerberos without a message of Kerberos.
 Leg EmptyAnswer(unsigned char state) {
   return {0xa1, 0x14, 0x30, 0x12, 0xa0, 0x03, 0x0a, 0x01, state, 0xa1, 0x0b,
           0x06, 0x09, 0x2a, 0x86, 0x48, 0x86, 0xf7, 0x12, 0x01,  0x02, 0x02};
@@ -58,12 +58,12 @@ class GssapiNegotiationHandlerTest : public RealmFixture {
     Testing::ExpectLogin(handler, serviceKeytab, kAlice);
   }
 
-  // What the service answers to the first leg of a negotiation.
+  // The service's answer to the first leg of a negotiation.
   static Leg AnswerTo(GssapiNegotiationHandler& handler) {
     return GssAcceptor(serviceKeytab).Accept(*handler.Negotiate({}));
   }
 
-  // On a thread of its own: the libraries keep the texts of earlier failures for a thread.
+  // Runs on a new thread, because the libraries keep the texts of earlier failures per thread.
   static std::string Failure(GssapiNegotiationHandler& handler, const Leg& leg = {}) {
     std::string message;
     std::thread([&] {
@@ -72,7 +72,7 @@ class GssapiNegotiationHandlerTest : public RealmFixture {
     return message;
   }
 
-  // The handler has forgotten the negotiation, and serves another.
+  // Expects that the handler has forgotten the negotiation and can begin another.
   static void ExpectServesAgain(GssapiNegotiationHandler& handler) {
     EXPECT_FALSE(handler.IsEstablished());
     EXPECT_EQ(ThrownMessage<Tarnik::InvalidStateException>([&] { handler.Negotiate({1}); }),
@@ -81,14 +81,14 @@ class GssapiNegotiationHandlerTest : public RealmFixture {
   }
 };
 
-TEST_F(GssapiNegotiationHandlerTest, ServesOneNegotiationAfterTheOther) {
+TEST_F(GssapiNegotiationHandlerTest, ServesNegotiationsInSequence) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   ExpectLogin(handler);
   ExpectLogin(handler);
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, HasThePeerProveItselfAndDelegatesNothing) {
+TEST_F(GssapiNegotiationHandlerTest, RequestsMutualAuthenticationAndDelegatesNothing) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   GssAcceptor acceptor(serviceKeytab);
   acceptor.Accept(*handler.Negotiate({}));
@@ -97,7 +97,7 @@ TEST_F(GssapiNegotiationHandlerTest, HasThePeerProveItselfAndDelegatesNothing) {
   EXPECT_EQ(acceptor.flags & GSS_C_DELEG_FLAG, 0U);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, HasNothingToSayAfterTheEnd) {
+TEST_F(GssapiNegotiationHandlerTest, SendsNothingAfterTheEnd) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   const Leg answer = AnswerTo(handler);
   for (const Leg& leg : {answer, answer, Leg{1, 2, 3}}) {
@@ -108,7 +108,7 @@ TEST_F(GssapiNegotiationHandlerTest, HasNothingToSayAfterTheEnd) {
   }
 }
 
-TEST_F(GssapiNegotiationHandlerTest, EndsWithAServiceThatAsksOnAndOn) {
+TEST_F(GssapiNegotiationHandlerTest, GivesUpOnAServiceThatNeverEnds) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   const Leg answer = AnswerTo(handler);
   for (int legs = 1; legs < 100; ++legs) {
@@ -159,7 +159,7 @@ TEST_F(GssapiNegotiationHandlerTest, NeedsNoRealmForTicketsThatItHas) {
   realm->SetClock(0s);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, MayBeUsedByAnotherThreadThanItsMaker) {
+TEST_F(GssapiNegotiationHandlerTest, MayBeUsedByAnotherThreadThanItsCreator) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   Leg answer;
   std::thread([&] { answer = AnswerTo(handler); }).join();
@@ -196,25 +196,25 @@ TEST_F(GssapiNegotiationHandlerTest, ThreadsLogInSideBySide) {
 
 TEST_F(GssapiNegotiationHandlerTest, RefusesASecondThreadInTheSameCall) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
-  std::promise<void> isInside;
-  std::promise<void> mayGoOn;
+  std::promise<void> isInCall;
+  std::promise<void> mayContinue;
   {
     const InitSecContextScript script([&] {
-      isInside.set_value();
-      mayGoOn.get_future().wait();
+      isInCall.set_value();
+      mayContinue.get_future().wait();
       return InitResult{GSS_S_CONTINUE_NEEDED, "leg", 0};
     });
     std::thread first([&] { EXPECT_EQ(*handler.Negotiate({}), (Leg{'l', 'e', 'g'})); });
-    isInside.get_future().wait();
+    isInCall.get_future().wait();
     EXPECT_EQ(ThrownMessage<Tarnik::InvalidStateException>([&] { handler.Negotiate({}); }),
               "The negotiation handler is in use by another thread.");
-    mayGoOn.set_value();
+    mayContinue.set_value();
     first.join();
   }
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, TellsThatThereAreNoCredentials) {
+TEST_F(GssapiNegotiationHandlerTest, ReportsThatThereAreNoCredentials) {
   auto config = ConfigOf("alice");
   config.credentialCache = "FILE:/nonexistent/other";
   GssapiNegotiationHandlerImpl handler(config);
@@ -224,7 +224,7 @@ TEST_F(GssapiNegotiationHandlerTest, TellsThatThereAreNoCredentials) {
   EXPECT_FALSE(handler.IsEstablished());
 }
 
-TEST_F(GssapiNegotiationHandlerTest, TellsOfAnUnknownService) {
+TEST_F(GssapiNegotiationHandlerTest, ReportsAnUnknownService) {
   auto config = ConfigOf("alice");
   config.targetService = "HTTP@unknown";
   GssapiNegotiationHandlerImpl handler(config);
@@ -233,7 +233,7 @@ TEST_F(GssapiNegotiationHandlerTest, TellsOfAnUnknownService) {
             "more information (Server HTTP/unknown@EXAMPLE.COM not found in Kerberos database).");
 }
 
-TEST_F(GssapiNegotiationHandlerTest, TellsOfClocksTooFarApart) {
+TEST_F(GssapiNegotiationHandlerTest, ReportsClocksThatAreTooFarApart) {
   auto config = ConfigOf("alice");
   config.credentialCache = realm->Login("alice", "secret", 9h);
   realm->SetClock(1h);
@@ -243,7 +243,7 @@ TEST_F(GssapiNegotiationHandlerTest, TellsOfClocksTooFarApart) {
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, TellsThatTheRealmDoesNotAnswer) {
+TEST_F(GssapiNegotiationHandlerTest, ReportsThatTheRealmDoesNotAnswer) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   realm->StopKdc();
   EXPECT_EQ(Failure(handler), Failed("Cannot contact any KDC for realm 'EXAMPLE.COM'"));
@@ -251,12 +251,12 @@ TEST_F(GssapiNegotiationHandlerTest, TellsThatTheRealmDoesNotAnswer) {
   ExpectLogin(handler);
 }
 
-// Kerberos gives a KDC some half a minute.
+// Kerberos waits about half a minute for a KDC.
 TEST_F(GssapiNegotiationHandlerTest, DoesNotHangWithASilentRealm) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   const auto start = std::chrono::steady_clock::now();
   {
-    const LoopbackSocket kdc;  // connections come about, but nobody accepts them
+    const LoopbackSocket kdc;  // connections are established but never accepted
     ASSERT_EQ(::listen(kdc.Descriptor(), 16), 0);
     ReplaceKdc(kdc.Port());
     EXPECT_EQ(Failure(handler), Failed("Cannot contact any KDC for realm 'EXAMPLE.COM'"));
@@ -268,7 +268,7 @@ TEST_F(GssapiNegotiationHandlerTest, DoesNotHangWithASilentRealm) {
   ExpectLogin(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, TellsThatTheServiceLacksItsKey) {
+TEST_F(GssapiNegotiationHandlerTest, ReportsThatTheServiceLacksItsKey) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   GssAcceptor acceptor(machineKeytab);
   const Leg refusal = acceptor.Accept(*handler.Negotiate({}));
@@ -277,14 +277,14 @@ TEST_F(GssapiNegotiationHandlerTest, TellsThatTheServiceLacksItsKey) {
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, DoesNotRepeatWhatAServiceSaysOfItsRefusal) {
+TEST_F(GssapiNegotiationHandlerTest, DoesNotRepeatTheTextOfAServicesRefusal) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   handler.Negotiate({});
   EXPECT_EQ(Failure(handler, RefusalWith("no\r\nline")), Failed("Generic error (see e-text)"));
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, TellsInOneLineWhatAKdcSaysOfItsRefusal) {
+TEST_F(GssapiNegotiationHandlerTest, ReportsTheTextOfAKdcsRefusalOnOneLine) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   {
     const TalkativeKdc kdc("no\r\nline \x1b[0m");
@@ -346,7 +346,7 @@ INSTANTIATE_TEST_SUITE_P(
                                   "SPNEGO failed to negotiate a mechanism")}),
     [](const auto& instance) { return instance.param.name; });
 
-// Proofs differ in length by a byte or so.
+// The length of proofs varies by about a byte.
 TEST_F(GssapiNegotiationHandlerTest, RefusesAProofCutAtAnyByte) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   Leg proof = AnswerTo(handler);
@@ -359,7 +359,7 @@ TEST_F(GssapiNegotiationHandlerTest, RefusesAProofCutAtAnyByte) {
   ExpectLogin(handler);
 }
 
-// What the real library is not made to do.
+// Results that the real library cannot be made to return.
 
 TEST_F(GssapiNegotiationHandlerTest, DoesNotWaitForTheServiceWithNothingToSend) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
@@ -372,7 +372,7 @@ TEST_F(GssapiNegotiationHandlerTest, DoesNotWaitForTheServiceWithNothingToSend) 
   ExpectServesAgain(handler);
 }
 
-TEST_F(GssapiNegotiationHandlerTest, DemandsThatTheServiceHasProvedItself) {
+TEST_F(GssapiNegotiationHandlerTest, RequiresThatTheServiceHasProvedItself) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   {
     const InitSecContextScript script([] {
@@ -426,14 +426,16 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         BadConfig{"NoService", {}, "the target service must not be empty."},
         BadConfig{
-            "NulInService", {kWithNul, "", "", ""}, "the target service must not hold a NUL."},
+            "NulInService", {kWithNul, "", "", ""}, "the target service must not contain a NUL."},
+        BadConfig{"NulInPrincipal",
+                  {kService, kWithNul, "", ""},
+                  "the principal must not contain a NUL."},
         BadConfig{
-            "NulInPrincipal", {kService, kWithNul, "", ""}, "the principal must not hold a NUL."},
-        BadConfig{"NulInKeytab", {kService, "", kWithNul, ""}, "the keytab must not hold a NUL."},
+            "NulInKeytab", {kService, "", kWithNul, ""}, "the keytab must not contain a NUL."},
         BadConfig{"NulInCache",
                   {kService, "", "", kWithNul},
-                  "the credential cache must not hold a NUL."},
-        BadConfig{"ServiceAlone", {"HTTP", "", "", ""}, NotOfTheForm("HTTP")},
+                  "the credential cache must not contain a NUL."},
+        BadConfig{"OnlyService", {"HTTP", "", "", ""}, NotOfTheForm("HTTP")},
         BadConfig{"NoHost", {"HTTP@", "", "", ""}, NotOfTheForm("HTTP@")},
         BadConfig{"NoServiceName", {"@host", "", "", ""}, NotOfTheForm("@host")},
         BadConfig{"Principal", {"HTTP/host", "", "", ""}, NotOfTheForm("HTTP/host")},
@@ -441,7 +443,7 @@ INSTANTIATE_TEST_SUITE_P(
         BadConfig{"TwoHosts", {"HTTP@a@b", "", "", ""}, NotOfTheForm("HTTP@a@b")}),
     [](const auto& instance) { return instance.param.name; });
 
-TEST(CreateGssapiNegotiationHandlerTest, LooksForNeitherTicketsNorFiles) {
+TEST(CreateGssapiNegotiationHandlerTest, AccessesNeitherTicketsNorFiles) {
   const auto handler = CreateGssapiNegotiationHandler(
       {kService, "machine", "/nonexistent/keytab", "FILE:/nonexistent"});
   ASSERT_NE(handler, nullptr);

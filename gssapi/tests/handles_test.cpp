@@ -12,7 +12,7 @@
 namespace SsoClient::Testing {
 namespace {
 
-constexpr char kSecret[] = "what logs somebody in";
+constexpr char kSecret[] = "data that authenticates a client";
 
 void Fill(gss_buffer_t buffer) {
   buffer->length = sizeof(kSecret);

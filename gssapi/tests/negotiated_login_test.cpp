@@ -1,5 +1,4 @@
-// The handler in the two places that legs are exchanged in, against a service that accepts
-// Kerberos.
+// The handler in the two places that exchange legs, with a service that accepts Kerberos.
 #include <ssoclient/gssapi_negotiation_handler.h>
 
 #include <gmock/gmock.h>
@@ -39,7 +38,7 @@ struct Behavior {
   bool isImpostor = false;
 };
 
-// Bytes of the request's only BinaryExchange.
+// The bytes of the request's only BinaryExchange.
 Leg LegOf(const SoapRequest& request) {
   const auto end = request.body.find("</wst:BinaryExchange>");
   const auto begin = request.body.rfind('>', end) + 1;
@@ -65,7 +64,7 @@ std::string TokenAnswer(const Leg& leg) {
            " Context=\"c\"")));
 }
 
-// A service's end of one connection.
+// The service's end of one connection.
 class Service final : public TransportSession {
  public:
   Service(const std::string& keytab, const Behavior& behavior)
@@ -147,13 +146,13 @@ TEST_F(NegotiatedLoginTest, SendsAnEmptyLegToAServiceThatGoesOnAfterTheProof) {
   EXPECT_TRUE(handler_->IsEstablished());
 }
 
-TEST_F(NegotiatedLoginTest, TellsThatAServiceHasNotProvedItself) {
+TEST_F(NegotiatedLoginTest, ReportsThatAServiceHasNotProvedItself) {
   EXPECT_NE(Acquire({.isLastLegSent = false}), nullptr);
   EXPECT_EQ(service_->Client(), "alice@EXAMPLE.COM");
   EXPECT_FALSE(handler_->IsEstablished());
 }
 
-TEST_F(NegotiatedLoginTest, GivesNoTokenOfAServiceThatCannotProveItself) {
+TEST_F(NegotiatedLoginTest, ReturnsNoTokenFromAServiceThatCannotProveItself) {
   for (const bool isTokenWithLastLeg : {true, false}) {
     EXPECT_THROW(Acquire({.isTokenWithLastLeg = isTokenWithLastLeg, .isImpostor = true}),
                  SsoException);
@@ -171,14 +170,14 @@ TEST_F(NegotiatedLoginTest, SendsNothingWithoutCredentials) {
   EXPECT_TRUE(service_->legs.empty());
 }
 
-TEST_F(NegotiatedLoginTest, ServesOneLoginAfterTheOther) {
+TEST_F(NegotiatedLoginTest, ServesLoginsInSequence) {
   EXPECT_NE(Acquire({}), nullptr);
   EXPECT_THROW(Acquire({.isImpostor = true}), SsoException);
   EXPECT_NE(Acquire({}), nullptr);
   EXPECT_TRUE(handler_->IsEstablished());
 }
 
-// The line is about the empty answer to the last leg. It means no harm.
+// The line is about the empty answer to the last leg. It is harmless.
 TEST_F(NegotiatedLoginTest, IsLoggedForItsLastLeg) {
   const LogCapture log(4);
   Acquire({});

@@ -11,7 +11,7 @@ thread_local std::string lastReleased;
 
 std::atomic<const SsoClient::Testing::InitSecContextScript*> current{nullptr};
 
-// The library frees it.
+// The library frees the copy.
 void Copy(const std::string& text, gss_buffer_t buffer) {
   if (text.empty()) {
     return;
@@ -23,7 +23,8 @@ void Copy(const std::string& text, gss_buffer_t buffer) {
 
 }  // namespace
 
-// The linker puts the second for the first, and leaves the library's own as the first.
+// The linker redirects calls to the __wrap_ functions; the library's functions are the __real_
+// ones.
 extern "C" {
 
 OM_uint32 __real_gss_init_sec_context(OM_uint32*, gss_cred_id_t, gss_ctx_id_t*, gss_name_t, gss_OID,

@@ -8,15 +8,15 @@
 
 namespace SsoClient::Testing {
 
-/// What a call of gss_init_sec_context gives.
+/// The result of a call of gss_init_sec_context.
 struct InitResult {
   OM_uint32 major = GSS_S_COMPLETE;
   std::string output;
   OM_uint32 flags = 0;
 };
 
-/// While it lives, gss_init_sec_context does what it says, and not what the library does. One at a
-/// time.
+/// During its lifetime, gss_init_sec_context runs the script instead of the library's function.
+/// There must be only one at a time.
 class InitSecContextScript {
  public:
   explicit InitSecContextScript(std::function<InitResult()> script);

@@ -22,7 +22,7 @@ bool Receive(int connection, void* data, std::size_t size) {
   return ::recv(connection, data, size, MSG_WAITALL) == static_cast<ssize_t>(size);
 }
 
-// Messages stand behind their length (RFC 4120, section 7.2.2).
+// Each message follows its length (RFC 4120, section 7.2.2).
 void Answer(int connection, const std::string& message) {
   std::uint32_t size = 0;
   if (!Receive(connection, &size, sizeof(size))) {

@@ -9,8 +9,8 @@
 
 namespace SsoClient::Testing {
 
-/// A KDC on loopback that answers every request with an error (RFC 4120, section 5.9.1) that has a
-/// text of its own.
+/// A KDC on loopback that answers every request with an error (RFC 4120, section 5.9.1) that
+/// contains the given text.
 class TalkativeKdc {
  public:
   explicit TalkativeKdc(std::string text);
@@ -28,7 +28,7 @@ class TalkativeKdc {
   std::thread thread_;
 };
 
-/// A KRB-ERROR with the code KRB_ERR_GENERIC.
+/// A KRB-ERROR with the code KRB_ERR_GENERIC and the given text.
 std::string KerberosError(std::string text);
 /// The leg of a service that refuses a login with such an error, in the frames of RFC 4121,
 /// section 4.1, and of RFC 4178.
