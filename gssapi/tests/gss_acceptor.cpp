@@ -52,6 +52,11 @@ std::vector<unsigned char> GssAcceptor::Accept(const std::vector<unsigned char>&
   return {bytes, bytes + output.Get().length};
 }
 
+std::vector<unsigned char> EmptyAnswer(unsigned char state) {
+  return {0xa1, 0x14, 0x30, 0x12, 0xa0, 0x03, 0x0a, 0x01, state, 0xa1, 0x0b,
+          0x06, 0x09, 0x2a, 0x86, 0x48, 0x86, 0xf7, 0x12, 0x01,  0x02, 0x02};
+}
+
 void ExpectLogin(GssapiNegotiationHandler& handler, const std::string& keytab,
                  const std::string& client) {
   GssAcceptor acceptor(keytab);

@@ -30,6 +30,10 @@ class GssAcceptor {
   GssContext context_;
 };
 
+/// A NegTokenResp (RFC 4178, section 4.2.2) for Kerberos with this state and without a message of
+/// Kerberos.
+std::vector<unsigned char> EmptyAnswer(unsigned char state);
+
 /// Negotiates with a service that has the keys of `keytab`, and expects it to see `client` log in.
 void ExpectLogin(GssapiNegotiationHandler& handler, const std::string& keytab,
                  const std::string& client);

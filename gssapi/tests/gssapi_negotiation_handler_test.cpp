@@ -28,7 +28,6 @@
 namespace SsoClient::Testing {
 namespace {
 
-using testing::HasSubstr;
 using TestSupport::ThrownMessage;
 using namespace std::chrono_literals;
 
@@ -44,12 +43,6 @@ std::string Failed(const std::string& major, const std::string& minor) {
 
 std::string Failed(const std::string& minor) {
   return Failed("Unspecified GSS failure.  Minor code may provide more information", minor);
-}
-
-// A NegTokenResp (RFC 4178, section 4.2.2) for Kerberos without a message of Kerberos.
-Leg EmptyAnswer(unsigned char state) {
-  return {0xa1, 0x14, 0x30, 0x12, 0xa0, 0x03, 0x0a, 0x01, state, 0xa1, 0x0b,
-          0x06, 0x09, 0x2a, 0x86, 0x48, 0x86, 0xf7, 0x12, 0x01,  0x02, 0x02};
 }
 
 class GssapiNegotiationHandlerTest : public RealmFixture {
@@ -272,7 +265,7 @@ TEST_F(GssapiNegotiationHandlerTest, ReportsThatTheServiceLacksItsKey) {
   GssapiNegotiationHandlerImpl handler(ConfigOf("alice"));
   GssAcceptor acceptor(machineKeytab);
   const Leg refusal = acceptor.Accept(*handler.Negotiate({}));
-  EXPECT_THAT(acceptor.error, HasSubstr("not found in keytab"));
+  EXPECT_THAT(acceptor.error, testing::HasSubstr("not found in keytab"));
   EXPECT_EQ(Failure(handler, refusal), Failed("The ticket isn't for us"));
   ExpectServesAgain(handler);
 }
