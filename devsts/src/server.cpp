@@ -3,13 +3,13 @@
 #include <stdexcept>
 #include <utility>
 
-#include "connection_threads.h"
-#include "conversation.h"
-#include "listener.h"
-#include "misbehavior_plan.h"
-#include "observation.h"
-#include "service.h"
-#include "tls_context.h"
+#include "operations/service.h"
+#include "wire/connection_threads.h"
+#include "wire/conversation.h"
+#include "wire/listener.h"
+#include "wire/misbehavior_plan.h"
+#include "wire/observation.h"
+#include "wire/tls_context.h"
 
 namespace DevSts {
 namespace {
@@ -18,7 +18,7 @@ Credential MakeAuthority() {
   CertificateSpec spec;
   spec.commonName = "Dev STS CA";
   spec.isAuthority = true;
-  spec.freshKey = true;  // no server's certificate is good at another's clients
+  spec.freshKey = true;  // clients of one server do not trust another's certificate
   return MakeCertificate(spec);
 }
 
@@ -72,7 +72,7 @@ class Server::Impl {
     try {
       threads.Start(socket, context, serve, closed);
     } catch (const std::runtime_error&) {
-      closed();  // no thread to be had: the peer sees its connection closed
+      closed();  // no thread could be started: the peer's connection is closed
     }
   }
 
@@ -85,7 +85,7 @@ class Server::Impl {
   MisbehaviorPlan plan;
   Observation observation;
   ConnectionThreads threads;
-  // Last, so that nothing is accepted before the rest is there or after it has gone.
+  // Declared last, so that connections are accepted only while the other members exist.
   Listener httpListener;
   Listener httpsListener;
 };

@@ -9,7 +9,7 @@
 
 namespace DevSts::Testing {
 
-// The answer is a fault of this code; its text begins so.
+// Expects the answer to be a fault with this code and a text that starts with `reason`.
 inline void ExpectFault(const std::string& answer, const std::string& code,
                         const std::string& reason) {
   EXPECT_THAT(answer, testing::StartsWith("HTTP/1.1 500 Internal Server Error\r\n"));

@@ -8,21 +8,21 @@
 
 namespace DevSts::Testing {
 
-// A client's side of a login by Kerberos inside SPNEGO.
+// The client's side of a login with Kerberos inside SPNEGO.
 class GssClient {
  public:
   static constexpr OM_uint32 kUsualFlags = GSS_C_MUTUAL_FLAG | GSS_C_INTEG_FLAG;
 
-  // By the tickets of `cache`, at the service of this Kerberos principal. Throws
-  // std::runtime_error, as every call does.
+  // Logs in with the tickets in `cache` at the service with this Kerberos principal. All calls
+  // throw std::runtime_error.
   GssClient(const std::string& cache, const std::string& service, OM_uint32 flags = kUsualFlags);
   ~GssClient();
   GssClient(const GssClient&) = delete;
   GssClient& operator=(const GssClient&) = delete;
 
-  // Takes the service's leg, none at first, and gives the next.
+  // Takes the service's leg, which is empty at first, and returns the client's next leg.
   std::string Step(const std::string& serverLeg = {});
-  // The service has proved itself, too.
+  // Whether the login is complete and the service has proved its identity.
   bool IsDone() const;
 
  private:

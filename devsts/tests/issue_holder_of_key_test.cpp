@@ -1,34 +1,27 @@
-// What the service issues to requests that prove a key.
+// Tokens for requests that prove possession of a key.
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <stdexcept>
+#include <string>
+#include <utility>
 
 #include "devsts/server.h"
 #include "raw_client.h"
 #include "signed_request.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
 using testing::AllOf;
-using Testing::Ask;
-using Testing::AssertionIn;
-using Testing::ByCertificate;
-using Testing::ByToken;
-using Testing::ElementText;
 using testing::HasSubstr;
-using Testing::Holder;
-using Testing::HolderToken;
-using Testing::IdOfAssertion;
-using Testing::IssueBody;
-using Testing::kUseKey;
 using testing::Not;
-using Testing::Replaced;
-using Testing::Sign;
 using testing::StartsWith;
-using Testing::UsernameToken;
 
 constexpr char kHolderOfKey[] = "Method=\"urn:oasis:names:tc:SAML:2.0:cm:holder-of-key\"";
 
-// The certificate's octets as they stand in an assertion.
+// The certificate's octets, encoded as in an assertion.
 std::string Base64Of(std::string pem) {
   pem = pem.substr(pem.find('\n') + 1);
   pem = pem.substr(0, pem.find("-----END"));
@@ -48,7 +41,7 @@ std::string AskByToken(const Server& server, const std::string& token, const std
   return Ask(server, Sign(ByToken(token, body), holder));
 }
 
-TEST(IssueHolderOfKey, ByPasswordBindsTheTokenToTheProvenKey) {
+TEST(IssueHolderOfKeyTest, ByPasswordBindsTheTokenToTheProvenKey) {
   const Server server;
   const Credential holder = Holder();
   const std::string assertion = HolderToken(server, holder);
@@ -58,7 +51,7 @@ TEST(IssueHolderOfKey, ByPasswordBindsTheTokenToTheProvenKey) {
   EXPECT_TRUE(VerifyXml(assertion, server.SigningCertificatePem()));
 }
 
-TEST(IssueHolderOfKey, ByPasswordStillNeedsThePassword) {
+TEST(IssueHolderOfKeyTest, ByPasswordStillNeedsThePassword) {
   const Server server;
   const Credential holder = Holder();
   const std::string answer =
@@ -69,7 +62,7 @@ TEST(IssueHolderOfKey, ByPasswordStillNeedsThePassword) {
   EXPECT_EQ(ElementText(answer, "faultstring"), "Invalid credentials");
 }
 
-TEST(IssueHolderOfKey, ByCertificateKnowsTheUserByIt) {
+TEST(IssueHolderOfKeyTest, ByCertificateIdentifiesTheUser) {
   Server server;
   const Credential machine = server.MakeClientCredential("machine");
   server.RegisterCertificate("machine@EXAMPLE.COM", machine.certificatePem);
@@ -80,32 +73,32 @@ TEST(IssueHolderOfKey, ByCertificateKnowsTheUserByIt) {
   ExpectBoundTo(machine, assertion);
 }
 
-TEST(IssueHolderOfKey, ByCertificateRefusesOneThatIsNobodys) {
+TEST(IssueHolderOfKeyTest, ByCertificateRefusesACertificateOfNoUser) {
   Server server;
   server.RegisterCertificate("machine@EXAMPLE.COM", Holder("machine").certificatePem);
   const Credential other = Holder("machine");
   const std::string answer =
       Ask(server, Sign(ByCertificate(other, IssueBody("PublicKey", kUseKey)), other));
   EXPECT_EQ(ElementText(answer, "faultcode"), "wst:FailedAuthentication");
-  EXPECT_EQ(ElementText(answer, "faultstring"), "The certificate is nobody's");
+  EXPECT_EQ(ElementText(answer, "faultstring"), "The certificate belongs to no user");
 }
 
-TEST(IssueHolderOfKey, ByCertificateIsRegisteredForAUserThatThereIs) {
+TEST(IssueHolderOfKeyTest, RegistersCertificatesOnlyForExistingUsers) {
   Server server;
   EXPECT_THROW(server.RegisterCertificate("nobody@EXAMPLE.COM", Holder().certificatePem),
                std::out_of_range);
   EXPECT_THROW(server.RegisterCertificate("machine@EXAMPLE.COM", "no PEM"), std::runtime_error);
 }
 
-TEST(IssueHolderOfKey, WithoutAnyCredentialIsRefused) {
+TEST(IssueHolderOfKeyTest, WithoutAnyCredentialIsRefused) {
   const Server server;
-  const std::string answer = Ask(server, Testing::Envelope("", IssueBody("Bearer")));
+  const std::string answer = Ask(server, Envelope("", IssueBody("Bearer")));
   EXPECT_EQ(ElementText(answer, "faultcode"), "wsse:InvalidSecurity");
   EXPECT_EQ(ElementText(answer, "faultstring"),
-            "No UsernameToken and no Signature behind the Timestamp");
+            "No UsernameToken and no Signature after the Timestamp");
 }
 
-TEST(IssueHolderOfKey, ByTokenIssuesToTheSameSubjectAndKey) {
+TEST(IssueHolderOfKeyTest, ByTokenIssuesToTheSameSubjectAndKey) {
   const Server server;
   const Credential holder = Holder();
   const std::string first = HolderToken(server, holder);
@@ -116,7 +109,7 @@ TEST(IssueHolderOfKey, ByTokenIssuesToTheSameSubjectAndKey) {
   ExpectBoundTo(holder, second);
 }
 
-TEST(IssueHolderOfKey, ByTokenIssuesABearerTokenIfAskedTo) {
+TEST(IssueHolderOfKeyTest, ByTokenIssuesABearerTokenIfRequested) {
   const Server server;
   const Credential holder = Holder();
   const std::string bearer =
@@ -125,7 +118,7 @@ TEST(IssueHolderOfKey, ByTokenIssuesABearerTokenIfAskedTo) {
   EXPECT_EQ(ElementText(bearer, "saml2:NameID"), "alice@EXAMPLE.COM");
 }
 
-TEST(IssueHolderOfKey, ByTokenHandsOnOneDelegationLessEachTime) {
+TEST(IssueHolderOfKeyTest, ByTokenAllowsOneDelegationLessEachTime) {
   const Server server;
   const Credential holder = Holder();
   const std::string first = HolderToken(server, holder);
@@ -134,26 +127,25 @@ TEST(IssueHolderOfKey, ByTokenHandsOnOneDelegationLessEachTime) {
   EXPECT_THAT(second, HasSubstr("<saml2:ProxyRestriction Count=\"9\"/>"));
 }
 
-TEST(IssueHolderOfKey, DelegatesToAnotherPrincipal) {
+TEST(IssueHolderOfKeyTest, DelegatesToAnotherPrincipal) {
   const Server server;
   const Credential holder = Holder();
-  const std::string assertion = HolderToken(server, holder, Testing::DelegateTo("bob@EXAMPLE.COM"));
+  const std::string assertion = HolderToken(server, holder, DelegateTo("bob@EXAMPLE.COM"));
   EXPECT_THAT(ElementText(assertion, "saml2:SubjectConfirmation"),
               HasSubstr(">bob@EXAMPLE.COM</saml2:NameID><saml2:SubjectConfirmationData"));
   EXPECT_THAT(ElementText(assertion, "del:Delegate"), HasSubstr(">bob@EXAMPLE.COM<"));
   ExpectBoundTo(holder, assertion);
 }
 
-// alice to machine to bob: the chain stands in its order and the confirmation names its end.
-TEST(IssueHolderOfKey, ByTokenWithActAsAddsTheRequesterToTheChain) {
+// alice to machine to bob: the chain is in order, and the confirmation names the last delegate.
+TEST(IssueHolderOfKeyTest, ByTokenWithActAsAddsTheRequesterToTheChain) {
   Server server;
   const Credential machine = server.MakeClientCredential("machine");
   server.RegisterCertificate("machine@EXAMPLE.COM", machine.certificatePem);
   const std::string machines = AssertionIn(
       Ask(server, Sign(ByCertificate(machine, IssueBody("PublicKey", kUseKey)), machine)));
-  const std::string alices = AssertionIn(Ask(server, Testing::AliceEnvelope()));
-  const std::string body =
-      IssueBody("PublicKey", Testing::DelegateTo("bob@EXAMPLE.COM") + Testing::ActAs(alices));
+  const std::string alices = AssertionIn(Ask(server, AliceEnvelope()));
+  const std::string body = IssueBody("PublicKey", DelegateTo("bob@EXAMPLE.COM") + ActAs(alices));
   const std::string assertion = AssertionIn(AskByToken(server, machines, body, machine));
 
   EXPECT_EQ(ElementText(assertion, "saml2:NameID"), "alice@EXAMPLE.COM");
@@ -170,22 +162,22 @@ TEST(IssueHolderOfKey, ByTokenWithActAsAddsTheRequesterToTheChain) {
   ExpectBoundTo(machine, assertion);
 }
 
-TEST(IssueHolderOfKey, ADelegateUsesItsTokenWithoutGrowingTheChain) {
+TEST(IssueHolderOfKeyTest, ADelegateUsesItsTokenWithoutGrowingTheChain) {
   Server server;
   const Credential machine = server.MakeClientCredential("machine");
   server.RegisterCertificate("machine@EXAMPLE.COM", machine.certificatePem);
   const std::string machines = AssertionIn(
       Ask(server, Sign(ByCertificate(machine, IssueBody("PublicKey", kUseKey)), machine)));
   const std::string alices =
-      AssertionIn(Ask(server, Testing::AliceEnvelope(Testing::DelegateTo("machine@EXAMPLE.COM"))));
-  const std::string assertion = AssertionIn(
-      AskByToken(server, machines, IssueBody("PublicKey", Testing::ActAs(alices)), machine));
+      AssertionIn(Ask(server, AliceEnvelope(DelegateTo("machine@EXAMPLE.COM"))));
+  const std::string assertion =
+      AssertionIn(AskByToken(server, machines, IssueBody("PublicKey", ActAs(alices)), machine));
   const std::size_t only = assertion.find("<del:Delegate ");
   ASSERT_NE(only, std::string::npos);
   EXPECT_EQ(assertion.find("<del:Delegate ", only + 1), std::string::npos);
 }
 
-TEST(IssueHolderOfKey, NothingDelegableComesOfATokenThatIsNot) {
+TEST(IssueHolderOfKeyTest, ByTokenRefusesToDelegateATokenThatIsNotDelegable) {
   const Server server;
   const Credential holder = Holder();
   const auto notDelegable = [](std::string body) {
@@ -198,15 +190,14 @@ TEST(IssueHolderOfKey, NothingDelegableComesOfATokenThatIsNot) {
   EXPECT_THAT(AskByToken(server, token, notDelegable(IssueBody("PublicKey")), holder),
               StartsWith("HTTP/1.1 200"));
   EXPECT_EQ(ElementText(AskByToken(server, token, IssueBody("PublicKey"), holder), "faultstring"),
-            "What is based on a token that is not delegable cannot be delegable");
-  const std::string delegates =
-      notDelegable(IssueBody("PublicKey", Testing::DelegateTo("bob@EXAMPLE.COM")));
+            "A token that is based on one that is not delegable cannot be delegable");
+  const std::string delegates = notDelegable(IssueBody("PublicKey", DelegateTo("bob@EXAMPLE.COM")));
   EXPECT_EQ(ElementText(AskByToken(server, token, delegates, holder), "faultstring"),
-            "What is based on a token that is not delegable cannot be delegated to "
+            "A token that is based on one that is not delegable cannot be delegated to "
             "bob@EXAMPLE.COM");
 }
 
-TEST(IssueHolderOfKey, ByTokenRefusesATokenThatIsNotGood) {
+TEST(IssueHolderOfKeyTest, ByTokenRefusesAnInvalidToken) {
   ServerOptions options;
   options.issuedTokenLimit = 1;
   Server server(options);
@@ -220,10 +211,10 @@ TEST(IssueHolderOfKey, ByTokenRefusesATokenThatIsNotGood) {
   EXPECT_THAT(faultOf(Replaced(token, "alice@EXAMPLE.COM", "carol@EXAMPLE.COM")),
               StartsWith("The presented token's signature does not verify: "));
   const Credential stranger = server.StrangerCredential();
-  EXPECT_THAT(faultOf(SignXml(Testing::WithoutSignature(token), stranger.privateKeyPem,
-                              stranger.certificatePem)),
-              StartsWith("The presented token's signature does not verify: "));
-  EXPECT_EQ(faultOf(Testing::WithoutSignature(token)), "The presented token has no signature");
+  EXPECT_THAT(
+      faultOf(SignXml(WithoutSignature(token), stranger.privateKeyPem, stranger.certificatePem)),
+      StartsWith("The presented token's signature does not verify: "));
+  EXPECT_EQ(faultOf(WithoutSignature(token)), "The presented token has no signature");
   EXPECT_TRUE(server.Revoke(IdOfAssertion(token)));
   EXPECT_EQ(faultOf(token), "The presented token was revoked");
   HolderToken(server, holder);
@@ -231,14 +222,14 @@ TEST(IssueHolderOfKey, ByTokenRefusesATokenThatIsNotGood) {
   EXPECT_FALSE(server.Revoke(IdOfAssertion(token)));
 }
 
-TEST(IssueHolderOfKey, RefusesAnActAsTokenThatWasRevoked) {
+TEST(IssueHolderOfKeyTest, RefusesARevokedActAsToken) {
   Server server;
-  const std::string alices = AssertionIn(Ask(server, Testing::AliceEnvelope()));
+  const std::string alices = AssertionIn(Ask(server, AliceEnvelope()));
   server.Revoke(IdOfAssertion(alices));
   const std::string answer =
-      Ask(server, Testing::IssueEnvelope("bob@EXAMPLE.COM", "bob-secret", Testing::ActAs(alices)));
+      Ask(server, IssueEnvelope("bob@EXAMPLE.COM", "bob-secret", ActAs(alices)));
   EXPECT_EQ(ElementText(answer, "faultstring"), "The ActAs token was revoked");
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

@@ -1,5 +1,7 @@
-#include <devsts/kerberos_realm.h>
+#include "devsts/kerberos_realm.h"
 
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <signal.h>
 
 #include <array>
@@ -11,8 +13,9 @@
 #include <iterator>
 #include <memory>
 #include <stdexcept>
+#include <string>
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
 using testing::HasSubstr;
@@ -35,7 +38,7 @@ Outcome RunInRealm(const KerberosRealm& realm, const std::string& command) {
   return outcome;
 }
 
-TEST(KerberosRealmTest, GivesUsersAndServicesTickets) {
+TEST(KerberosRealmTest, IssuesTicketsForUsersAndServices) {
   KerberosRealm realm;
   realm.AddUser("alice", "secret");
   const std::string keytab = realm.AddKeytab("HTTP/sts.example");
@@ -57,7 +60,7 @@ TEST(KerberosRealmTest, RefusesAWrongPassword) {
   }
 }
 
-TEST(KerberosRealmTest, IssuesExpiredTicketsWithAClockThatIsSlow) {
+TEST(KerberosRealmTest, IssuesExpiredTicketsWithASlowClock) {
   KerberosRealm realm;
   realm.AddUser("alice", "secret");
   realm.SetClock(-1h);
@@ -74,7 +77,7 @@ TEST(KerberosRealmTest, DoesNotAnswerWithoutItsKdc) {
   EXPECT_THROW(realm.Login("alice", "secret"), std::runtime_error);
 }
 
-TEST(KerberosRealmTest, LeavesNothingBehind) {
+TEST(KerberosRealmTest, StopsItsKdcAndRemovesItsFolder) {
   std::string folder;
   pid_t kdc = 0;
   {
@@ -88,7 +91,7 @@ TEST(KerberosRealmTest, LeavesNothingBehind) {
   EXPECT_EQ(errno, ESRCH);
 }
 
-TEST(KerberosRealmTest, RefusesNamesThatItsToolsWouldReadOtherwise) {
+TEST(KerberosRealmTest, RefusesNamesThatItsToolsWouldMisread) {
   KerberosRealm realm;
   for (const std::string name : {"", "a b", "a\"b", "-randkey", "a\nb"}) {
     EXPECT_THROW(realm.AddUser(name, "secret"), std::runtime_error) << name;
@@ -97,4 +100,4 @@ TEST(KerberosRealmTest, RefusesNamesThatItsToolsWouldReadOtherwise) {
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

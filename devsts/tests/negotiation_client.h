@@ -14,10 +14,11 @@ inline constexpr char kContinueAction[] =
 std::string ToBase64(const std::string& octets);
 std::string FromBase64(const std::string& text);
 
-// wst:BinaryExchange around octets.
+// A wst:BinaryExchange that contains the octets.
 std::string Exchange(const std::string& octets);
 
-// wst:RequestSecurityToken of a negotiation's first leg. `more` stands behind wst:Delegatable.
+// The wst:RequestSecurityToken of a negotiation's first leg. `more` is inserted after
+// wst:Delegatable.
 std::string FirstLegBody(const std::string& context, const std::string& leg,
                          const std::string& keyType = "Bearer", const std::string& more = "");
 std::string LaterLegBody(const std::string& context, const std::string& leg);
@@ -27,19 +28,19 @@ std::string ContextIn(const std::string& answer);
 // The octets of the answer's BinaryExchange, empty if there is none.
 std::string LegIn(const std::string& answer);
 
-// One client's negotiation with the service, which keeps its Context and its cookie.
+// A client's negotiation with the service. Keeps its Context and its cookie.
 class NegotiationClient {
  public:
   explicit NegotiationClient(const Server& server);
 
-  // Each gives the whole answer.
+  // Each returns the whole answer.
   std::string SendFirst(const std::string& leg, const std::string& more = "");
   std::string SendNext(const std::string& leg);
-  // A first leg whose envelope was made elsewhere.
+  // Sends a first leg in the given envelope.
   std::string SendFirstEnvelope(const std::string& envelope);
 
   std::string context;
-  std::string cookie;  // as in a Cookie field; empty: none is sent
+  std::string cookie;  // as in a Cookie field; if empty, none is sent
 
  private:
   std::string Send(const std::string& envelope, const std::string& action) const;

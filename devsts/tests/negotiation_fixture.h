@@ -13,8 +13,8 @@
 
 namespace DevSts::Testing {
 
-// A realm with users who have logged on, and a service that has its key. The environment is changed
-// while no other thread runs.
+// A realm with users who have logged in, and the keytab of a service. Changes the environment only
+// while there is no other thread.
 class NegotiationFixture : public testing::Test {
  protected:
   static constexpr char kService[] = "HTTP/localhost@EXAMPLE.COM";

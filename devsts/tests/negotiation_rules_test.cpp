@@ -1,5 +1,13 @@
-// What a negotiation's requests must be like, and what the service does wrong when told to.
+// The rules for the requests of a negotiation, and the misbehaviour of the service.
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
 
 #include "devsts/negotiation.h"
 #include "expect_fault.h"
@@ -27,9 +35,9 @@ class NegotiationRulesTest : public NegotiationFixture {
   }
 };
 
-// A login up to the last leg, which is not sent yet.
-struct Begun {
-  explicit Begun(const Server& server, const std::string& cache, const std::string& service)
+// A login up to the last leg, which has not been sent.
+struct StartedLogin {
+  explicit StartedLogin(const Server& server, const std::string& cache, const std::string& service)
       : client(server), gss(cache, service) {
     first = client.SendFirst(gss.Step());
     last = gss.Step(LegIn(first));
@@ -41,7 +49,7 @@ struct Begun {
   std::string last;
 };
 
-// The envelope with a Timestamp that is over.
+// The envelope with an expired Timestamp.
 std::string Stale(std::string envelope) {
   const std::string end = "</wsu:Timestamp>";
   const std::size_t from = envelope.find("<wsu:Timestamp");
@@ -59,27 +67,27 @@ bool HoldsToken(const std::string& answer) {
   return !AssertionIn(answer).empty();
 }
 
-TEST_F(NegotiationRulesTest, DemandsTheCookieOfTheNegotiation) {
+TEST_F(NegotiationRulesTest, RequiresTheCookieOfTheNegotiation) {
   const auto server = TwoLegServer();
-  Begun login(*server, alice, kService);
-  const Begun other(*server, bob, kService);
+  StartedLogin login(*server, alice, kService);
+  const StartedLogin other(*server, bob, kService);
   const std::string cookie = login.client.cookie;
   for (const std::string& wrong :
        {std::string(), std::string("devsts-negotiation="), cookie + "0", other.client.cookie,
         "other-" + cookie, cookie.substr(0, cookie.size() - 1)}) {
     login.client.cookie = wrong;
     ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest",
-                "The request does not carry the cookie of its negotiation");
+                "The request does not have the cookie of its negotiation");
   }
   login.client.cookie = cookie + "\r\nCookie: " + cookie;
   ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest",
               "Cookie is given more than once");
-  // Who has not the cookie cannot end the negotiation.
+  // Requests without the cookie have not ended the negotiation.
   login.client.cookie = "first=1; " + cookie + "; last=2";
   EXPECT_TRUE(HoldsToken(login.client.SendNext(login.last)));
 }
 
-TEST_F(NegotiationRulesTest, SetsACookieThatScriptsAndPlainHttpDoNotSee) {
+TEST_F(NegotiationRulesTest, SetsACookieHiddenFromScriptsAndPlainHttp) {
   const Server server(Options());
   NegotiationClient client(server);
   GssClient gss(alice, kService);
@@ -97,11 +105,11 @@ TEST_F(NegotiationRulesTest, SetsACookieThatScriptsAndPlainHttpDoNotSee) {
 
 TEST_F(NegotiationRulesTest, SetsNoCookieOnLaterLegs) {
   const auto server = TwoLegServer();
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   EXPECT_THAT(login.client.SendNext(login.last), Not(HasSubstr("Set-Cookie")));
 }
 
-TEST_F(NegotiationRulesTest, KnowsNoContextThatNobodyBegan) {
+TEST_F(NegotiationRulesTest, RefusesAnUnknownContext) {
   const Server server(Options());
   NegotiationClient client(server);
   ExpectFault(client.SendNext("leg"), "wst:InvalidRequest", kUnknown + client.context);
@@ -109,21 +117,21 @@ TEST_F(NegotiationRulesTest, KnowsNoContextThatNobodyBegan) {
 
 TEST_F(NegotiationRulesTest, ForgetsANegotiationThatHasEnded) {
   const auto server = TwoLegServer();
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   EXPECT_TRUE(HoldsToken(login.client.SendNext(login.last)));
   ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest", kUnknown);
 }
 
 TEST_F(NegotiationRulesTest, ForgetsANegotiationThatHasFailed) {
   const auto server = TwoLegServer();
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   ExpectFault(login.client.SendNext("garbage"), "wst:InvalidRequest", "The leg is not readable");
   ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest", kUnknown);
 }
 
 TEST_F(NegotiationRulesTest, DoesNotBeginTwiceInOneContext) {
   const auto server = TwoLegServer();
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   NegotiationClient intruder(*server);
   intruder.context = login.client.context;
   GssClient gss(bob, kService);
@@ -134,7 +142,7 @@ TEST_F(NegotiationRulesTest, DoesNotBeginTwiceInOneContext) {
 
 TEST_F(NegotiationRulesTest, TakesOneLegOfANegotiationAtATime) {
   const auto server = TwoLegServer();
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   std::string meanwhile;
   AssertionOptions shape;
   shape.beforeSigning = [&](std::string&) { meanwhile = login.client.SendNext(login.last); };
@@ -147,9 +155,9 @@ TEST_F(NegotiationRulesTest, ForgetsTheOldestWhenThereAreTooMany) {
   ServerOptions options = Options();
   options.negotiation.limit = 2;
   const auto server = TwoLegServer(options);
-  Begun first(*server, alice, kService);
-  Begun second(*server, alice, kService);
-  Begun third(*server, alice, kService);
+  StartedLogin first(*server, alice, kService);
+  StartedLogin second(*server, alice, kService);
+  StartedLogin third(*server, alice, kService);
   EXPECT_EQ(server->OpenNegotiations(), 2U);
   ExpectFault(first.client.SendNext(first.last), "wst:InvalidRequest", kUnknown);
   EXPECT_TRUE(HoldsToken(second.client.SendNext(second.last)));
@@ -160,11 +168,11 @@ TEST_F(NegotiationRulesTest, ForgetsANegotiationThatTakesTooLong) {
   ServerOptions options = Options();
   options.negotiation.maxAge = std::chrono::milliseconds(0);
   const auto server = TwoLegServer(options);
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest", kUnknown);
 }
 
-TEST_F(NegotiationRulesTest, HoldsFirstLegsToTheRulesOfRequests) {
+TEST_F(NegotiationRulesTest, AppliesTheRulesOfRequestsToFirstLegs) {
   const Server server(Options());
   const std::string good = Envelope("", FirstLegBody("urn:uuid:rules", "leg"));
   struct Case {
@@ -205,7 +213,7 @@ TEST_F(NegotiationRulesTest, HoldsFirstLegsToTheRulesOfRequests) {
   EXPECT_EQ(server.GetCounters().negotiations, 0U);
 }
 
-TEST_F(NegotiationRulesTest, TakesNoTokenForALogin) {
+TEST_F(NegotiationRulesTest, RefusesATokenInsteadOfALogin) {
   const Server server(Options());
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
@@ -215,9 +223,9 @@ TEST_F(NegotiationRulesTest, TakesNoTokenForALogin) {
               "A signature by a token is not expected in a negotiation");
 }
 
-TEST_F(NegotiationRulesTest, HoldsLaterLegsToTheRulesAndWaitsForARightOne) {
+TEST_F(NegotiationRulesTest, AppliesTheRulesToLaterLegsAndWaitsForAValidOne) {
   const auto server = TwoLegServer();
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   const std::string body = LaterLegBody(login.client.context, login.last);
   const std::string good = Envelope("", body);
   const Credential holder = Holder();
@@ -229,9 +237,9 @@ TEST_F(NegotiationRulesTest, HoldsLaterLegsToTheRulesAndWaitsForARightOne) {
   const std::vector<Case> cases = {
       {Stale(good), "wsu:MessageExpired", "The Timestamp has expired"},
       {Envelope(UsernameToken("alice@EXAMPLE.COM", "secret"), body), "wsse:InvalidSecurity",
-       "Neither login nor signature is expected where a negotiation goes on"},
+       "Neither a login nor a signature is expected in a later leg of a negotiation"},
       {Sign(ByCertificate(holder, body), holder), "wsse:InvalidSecurity",
-       "Neither login nor signature is expected where a negotiation goes on"},
+       "Neither a login nor a signature is expected in a later leg of a negotiation"},
       {Envelope("", IssueBody("Bearer")), "wst:InvalidRequest",
        "Expected RequestSecurityTokenResponse"},
       {Replaced(good, "</wst:BinaryExchange>", "</wst:BinaryExchange><wst:More/>"),
@@ -249,7 +257,7 @@ TEST_F(NegotiationRulesTest, HoldsLaterLegsToTheRulesAndWaitsForARightOne) {
   EXPECT_TRUE(HoldsToken(login.client.SendNext(login.last)));
 }
 
-TEST_F(NegotiationRulesTest, FailsAtTheLegThatItIsTold) {
+TEST_F(NegotiationRulesTest, FailsAtTheLegThatTheScriptNames) {
   Server server(Options());
   for (const unsigned leg : {1U, 2U, 3U}) {
     NegotiationScript script;
@@ -272,7 +280,7 @@ TEST_F(NegotiationRulesTest, FailsAtTheLegThatItIsTold) {
 TEST_F(NegotiationRulesTest, ForgetsTheNegotiationWhenTold) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.forget = true}));
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   EXPECT_EQ(ContextIn(login.first), login.client.context);
   ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest", kUnknown);
 }
@@ -280,15 +288,15 @@ TEST_F(NegotiationRulesTest, ForgetsTheNegotiationWhenTold) {
 TEST_F(NegotiationRulesTest, AnswersWithAnEmptyContextWhenTold) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.context = ""}));
-  const Begun login(*server, alice, kService);
+  const StartedLogin login(*server, alice, kService);
   EXPECT_EQ(ContextIn(login.first), "");
   EXPECT_EQ(server->OpenNegotiations(), 0U);
 }
 
-TEST_F(NegotiationRulesTest, GoesOnInAnotherContextWhenTold) {
+TEST_F(NegotiationRulesTest, ContinuesInAnotherContextWhenTold) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.context = "urn:uuid:another"}));
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   EXPECT_EQ(ContextIn(login.first), "urn:uuid:another");
   ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest",
               kUnknown + login.client.context);
@@ -298,7 +306,7 @@ TEST_F(NegotiationRulesTest, GoesOnInAnotherContextWhenTold) {
   EXPECT_EQ(ContextIn(answer), "urn:uuid:another");
 }
 
-TEST_F(NegotiationRulesTest, LeavesTheContextOutWhenTold) {
+TEST_F(NegotiationRulesTest, OmitsTheContextWhenTold) {
   Server server(Options());
   server.MisbehaveNext(Wrong({.omitContext = true}));
   NegotiationClient client(server);
@@ -322,13 +330,13 @@ TEST_F(NegotiationRulesTest, AnswersWithAnotherLegWhenTold) {
                                    Not(HasSubstr("BinaryExchange"))));
 }
 
-TEST_F(NegotiationRulesTest, SetsNoCookieWhenToldAndStillDemandsIt) {
+TEST_F(NegotiationRulesTest, SetsNoCookieWhenToldAndStillRequiresIt) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.omitCookie = true}));
-  Begun login(*server, alice, kService);
+  StartedLogin login(*server, alice, kService);
   EXPECT_EQ(login.client.cookie, "");
   ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest",
-              "The request does not carry the cookie of its negotiation");
+              "The request does not have the cookie of its negotiation");
 }
 
 }  // namespace

@@ -2,10 +2,14 @@
 
 #include <gmock/gmock.h>
 #include <gssapi/gssapi_ext.h>
+#include <gtest/gtest.h>
 
 #include <array>
-#include <optional>
+#include <cstddef>
+#include <stdexcept>
+#include <string>
 #include <thread>
+#include <vector>
 
 #include "expect_fault.h"
 #include "negotiation_fixture.h"
@@ -22,16 +26,16 @@ using testing::Not;
 using testing::StartsWith;
 
 constexpr char kGranted[] = "<wst:RequestSecurityTokenResponseCollection>";
-constexpr char kAskedOn[] = "/200512\"><wst:RequestSecurityTokenResponse Context=";
-// NegTokenResp with the state accept-incomplete and nothing else.
-constexpr char kGoOn[] = "\xa1\x07\x30\x05\xa0\x03\x0a\x01\x01";
+constexpr char kNextLegAnswer[] = "/200512\"><wst:RequestSecurityTokenResponse Context=";
+// A NegTokenResp that contains only the state accept-incomplete.
+constexpr char kAcceptIncomplete[] = "\xa1\x07\x30\x05\xa0\x03\x0a\x01\x01";
 
 // The object identifier of Kerberos (RFC 4121, section 4.1).
 constexpr char kKerberos[] = "\x06\x09\x2a\x86\x48\x86\xf7\x12\x01\x02\x02";
 
 class NegotiationTest : public NegotiationFixture {};
 
-// The answer to a login by one leg.
+// The answer to a login with one leg.
 std::string LogIn(const Server& server, const std::string& cache, const char* service) {
   NegotiationClient client(server);
   GssClient gss(cache, service);
@@ -60,20 +64,20 @@ TEST_F(NegotiationTest, LogsInByOneLeg) {
   EXPECT_TRUE(gss.IsDone());
 }
 
-TEST_F(NegotiationTest, LogsInAClientThatAsksForNoProofOfTheService) {
+TEST_F(NegotiationTest, LogsInAClientThatRequestsNoProofOfTheService) {
   const Server server(Options());
   NegotiationClient client(server);
   GssClient gss(alice, kService, GSS_C_INTEG_FLAG);
   EXPECT_EQ(LoggedInAs(client.SendFirst(gss.Step())), "alice@EXAMPLE.COM");
 }
 
-// With DCE_STYLE (RFC 4757, section 7.1), Kerberos itself takes a third message.
+// With DCE_STYLE (RFC 4757, section 7.1), Kerberos itself has a third message.
 TEST_F(NegotiationTest, TakesTheLegsThatTheMechanismHas) {
   const Server server(Options());
   NegotiationClient client(server);
   GssClient gss(alice, kService, GssClient::kUsualFlags | GSS_C_DCE_STYLE);
   const std::string first = client.SendFirst(gss.Step());
-  EXPECT_THAT(first, AllOf(StartsWith("HTTP/1.1 200 OK\r\n"), HasSubstr(kAskedOn),
+  EXPECT_THAT(first, AllOf(StartsWith("HTTP/1.1 200 OK\r\n"), HasSubstr(kNextLegAnswer),
                            Not(HasSubstr("Assertion"))));
   EXPECT_EQ(ContextIn(first), client.context);
   EXPECT_EQ(server.OpenNegotiations(), 1U);
@@ -89,7 +93,7 @@ TEST_F(NegotiationTest, AsksForTheSignatureOfTheMechanisms) {
   NegotiationClient client(server);
   GssClient gss(alice, kService);
   const std::string first = client.SendFirst(gss.Step());
-  EXPECT_THAT(first, HasSubstr(kAskedOn));
+  EXPECT_THAT(first, HasSubstr(kNextLegAnswer));
   const std::string leg = gss.Step(LegIn(first));
   EXPECT_THAT(leg, Not(IsEmpty()));
   EXPECT_TRUE(gss.IsDone());
@@ -117,7 +121,8 @@ TEST_F(NegotiationTest, RefusesALegWithoutTheSignatureOfTheMechanisms) {
     const char* reason;
   };
   const std::vector<Case> cases = {
-      {kGoOn, "wst:FailedAuthentication", "The signature of the list of mechanisms is missing"},
+      {kAcceptIncomplete, "wst:FailedAuthentication",
+       "The signature of the list of mechanisms is missing"},
       {"", "wst:InvalidRequest", "The leg is not readable: the message ends early"},
       {"no token at all", "wst:InvalidRequest", "The leg is not readable"},
       {"\xa1\x07\x30\x05\xa0\x7f\x0a\x01\x01", "wst:InvalidRequest",
@@ -147,8 +152,8 @@ TEST_F(NegotiationTest, AsksForMoreLegsWhenTheLoginIsDone) {
   EXPECT_TRUE(gss.IsDone());
   for (int i = 0; i < 2; ++i) {
     answer = client.SendNext(i == 0 ? "" : "anything");
-    EXPECT_THAT(answer, HasSubstr(kAskedOn));
-    EXPECT_EQ(LegIn(answer), kGoOn);
+    EXPECT_THAT(answer, HasSubstr(kNextLegAnswer));
+    EXPECT_EQ(LegIn(answer), kAcceptIncomplete);
     EXPECT_EQ(ContextIn(answer), client.context);
   }
   answer = client.SendNext("");
@@ -192,7 +197,7 @@ TEST_F(NegotiationTest, BindsTheTokenToTheKeyThatSignedTheFirstLeg) {
   NegotiationClient client(server);
   GssClient gss(alice, kService);
   const Credential holder = Holder();
-  // wst:UseKey stands in front of wst:BinaryExchange.
+  // wst:UseKey comes before wst:BinaryExchange.
   const std::string body = FirstLegBody(client.context, gss.Step(), "PublicKey", kUseKey);
   const std::string first = client.SendFirstEnvelope(Sign(ByCertificate(holder, body), holder));
   const std::string answer = client.SendNext(gss.Step(LegIn(first)));
@@ -212,7 +217,7 @@ TEST_F(NegotiationTest, IssuesWhatTheFirstLegAskedFor) {
   EXPECT_THAT(assertion, HasSubstr(">bob@EXAMPLE.COM</saml2:NameID></del:Delegate>"));
 }
 
-TEST_F(NegotiationTest, JudgesAnActAsTokenWhenTheLoginIsDone) {
+TEST_F(NegotiationTest, ChecksAnActAsTokenWhenTheLoginIsDone) {
   Server server(Options());
   const std::string token = AssertionIn(Ask(server, AliceEnvelope()));
   server.SetNegotiationScript({.requestMic = true});
@@ -232,13 +237,13 @@ TEST_F(NegotiationTest, MapsPrincipalsToUsers) {
   const std::string answer = LogIn(server, carol, kService);
   EXPECT_EQ(LoggedInAs(answer), "alice@EXAMPLE.COM");
   ExpectFault(LogIn(server, bob, kService), "wst:FailedAuthentication",
-              "The principal is nobody's: bob@EXAMPLE.COM");
+              "The principal belongs to no user: bob@EXAMPLE.COM");
 }
 
 TEST_F(NegotiationTest, RefusesAnUnknownPrincipal) {
   const Server server(Options());
   ExpectFault(LogIn(server, carol, kService), "wst:FailedAuthentication",
-              "The principal is nobody's: carol@EXAMPLE.COM");
+              "The principal belongs to no user: carol@EXAMPLE.COM");
   EXPECT_EQ(server.OpenNegotiations(), 0U);
 }
 
@@ -257,7 +262,7 @@ TEST_F(NegotiationTest, DoesNotBeginWithAKeytabThatIsMissing) {
   options.negotiation.keytab = realm->Folder() + "/missing.keytab";
   try {
     const Server server(options);
-    FAIL() << "The server began";
+    FAIL() << "The server started";
   } catch (const std::runtime_error& error) {
     EXPECT_THAT(error.what(), HasSubstr("missing.keytab"));
   }
@@ -282,7 +287,7 @@ TEST_F(NegotiationTest, RefusesATicketForALaterKey) {
               "found in keytab; keytab is likely out of date");
 }
 
-TEST_F(NegotiationTest, RefusesALegThatIsPlayedAgain) {
+TEST_F(NegotiationTest, RefusesAReplayedLeg) {
   const Server server(Options());
   NegotiationClient client(server);
   GssClient gss(alice, kService);
@@ -293,21 +298,21 @@ TEST_F(NegotiationTest, RefusesALegThatIsPlayedAgain) {
               "The negotiation failed: Request is a replay");
 }
 
-TEST_F(NegotiationTest, RefusesLegsThatAreNone) {
+TEST_F(NegotiationTest, RefusesInvalidLegs) {
   const Server server(Options());
   const std::vector<std::string> legs = {"garbage", std::string(3000, '\0'),
-                                         std::string("\x60\x82\xff\xff", 4), kGoOn};
+                                         std::string("\x60\x82\xff\xff", 4), kAcceptIncomplete};
   for (const std::string& leg : legs) {
     NegotiationClient client(server);
     ExpectFault(client.SendFirst(leg), "wst:InvalidRequest",
                 "The negotiation failed: Invalid token was supplied");
   }
   NegotiationClient client(server);
-  ExpectFault(client.SendFirst(""), "wst:InvalidRequest", "The BinaryExchange holds no leg");
+  ExpectFault(client.SendFirst(""), "wst:InvalidRequest", "The BinaryExchange contains no leg");
   EXPECT_EQ(server.OpenNegotiations(), 0U);
 }
 
-// The list of mechanisms names Kerberos, and then Kerberos' own message begins with its name.
+// Kerberos is named first in the list of mechanisms, then at the start of its own message.
 TEST_F(NegotiationTest, RefusesKerberosOutsideSpnego) {
   const Server server(Options());
   NegotiationClient client(server);
@@ -323,7 +328,7 @@ TEST_F(NegotiationTest, RefusesKerberosOutsideSpnego) {
               "unavailable or inaccessible");
 }
 
-TEST_F(NegotiationTest, KeepsNegotiationsApartThatAreMixed) {
+TEST_F(NegotiationTest, KeepsInterleavedNegotiationsApart) {
   Server server(Options());
   server.SetNegotiationScript({.requestMic = true});
   NegotiationClient first(server);

@@ -35,7 +35,7 @@ int Connect(std::uint16_t port, const std::string& address) {
   if (made < 0 || connect(made, reinterpret_cast<sockaddr*>(&storage), size) != 0) {
     throw std::runtime_error("cannot connect");
   }
-  const timeval limit{20, 0};  // no test hangs on a server that says nothing
+  const timeval limit{20, 0};  // so that no test hangs if the server does not answer
   setsockopt(made, SOL_SOCKET, SO_RCVTIMEO, &limit, sizeof limit);
   return made;
 }
@@ -119,16 +119,16 @@ void RawClient::Send(std::string_view octets) {
 bool RawClient::ReadSome(std::string& text) {
   std::array<char, 16 * 1024> octets{};
   errno = 0;
-  const long got = tls_ ? SSL_read(tls_.get(), octets.data(), static_cast<int>(octets.size()))
-                        : recv(socket_, octets.data(), octets.size(), 0);
-  if (got > 0) {
-    text.append(octets.data(), static_cast<std::size_t>(got));
+  const long received = tls_ ? SSL_read(tls_.get(), octets.data(), static_cast<int>(octets.size()))
+                             : recv(socket_, octets.data(), octets.size(), 0);
+  if (received > 0) {
+    text.append(octets.data(), static_cast<std::size_t>(received));
     return true;
   }
   const int systemError = errno;
   ERR_clear_error();
   if (systemError == EAGAIN) {
-    throw std::runtime_error("the server says nothing");
+    throw std::runtime_error("the server does not answer");
   }
   if (systemError == ECONNRESET || systemError == EPIPE) {
     ending_ = Ending::Reset;

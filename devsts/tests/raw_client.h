@@ -12,10 +12,10 @@
 
 namespace DevSts::Testing {
 
-// How the server ended what a client read.
+// How the server ended the connection.
 enum class Ending { Open, Orderly, Truncated, Reset };
 
-// A client that sends and receives octets, for looking at what the server does on the wire.
+// A client that sends and receives octets, for tests of the server's behaviour on the wire.
 class RawClient {
  public:
   explicit RawClient(std::uint16_t port, const std::string& address = "127.0.0.1");
@@ -23,18 +23,19 @@ class RawClient {
   RawClient(const RawClient&) = delete;
   RawClient& operator=(const RawClient&) = delete;
 
-  // Trusts nothing but `caPem`, and checks the address. OpenSSL's verification result if the
-  // handshake fails for it, -1 for any other failure, X509_V_OK if it succeeds.
+  // Trusts only `caPem` and checks the host. Returns X509_V_OK on success, OpenSSL's verification
+  // result if that is why the handshake failed, -1 for any other failure.
   long StartTls(const std::string& caPem, SSL_SESSION* resume = nullptr,
                 const std::string& host = "127.0.0.1");
   void UseClientCredential(const std::string& certificatePem, const std::string& keyPem);
 
   void Send(std::string_view octets);
-  // Reads until the text ends in an answer of Content-Length or chunks, or the server ends it.
+  // Reads until the text is a complete answer, by Content-Length or chunks, or the server ends the
+  // connection.
   std::string ReadAnswer();
   // Reads until the server ends the connection.
   std::string ReadToEnd();
-  // Appends what arrives next; false at the end.
+  // Appends what arrives next; returns false at the end.
   bool ReadSome(std::string& text);
   // Whether nothing arrives for this long.
   bool IsSilent(std::chrono::milliseconds time) const;
@@ -51,7 +52,7 @@ class RawClient {
   Ending ending_ = Ending::Open;
 };
 
-// A POST of the envelope as the service wants it.
+// A POST request with the envelope as the service expects it.
 std::string PostOf(const std::string& envelope, const std::string& action);
 
 }  // namespace DevSts::Testing

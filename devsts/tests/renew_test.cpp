@@ -1,41 +1,29 @@
 // Renewal of tokens.
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
+#include <cstddef>
 #include <cstring>
+#include <string>
 
 #include "devsts/server.h"
 #include "expect_fault.h"
 #include "raw_client.h"
 #include "signed_request.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
-using Testing::Ask;
-using Testing::AssertionIn;
-using Testing::ByCertificate;
-using Testing::ByToken;
-using Testing::ElementText;
-using Testing::ExpectFault;
 using testing::HasSubstr;
-using Testing::Holder;
-using Testing::HolderToken;
-using Testing::IdOfAssertion;
-using Testing::kRenewAction;
-using Testing::kUseKey;
 using testing::Not;
-using Testing::RenewBody;
-using Testing::Replaced;
-using Testing::Sign;
 using testing::StartsWith;
-using Testing::TimeFromNow;
 
 std::string AskToRenew(const Server& server, const std::string& token, const Credential& holder,
-                       const Testing::Edits& edits = {}) {
+                       const Edits& edits = {}) {
   return Ask(server, Sign(ByCertificate(holder, RenewBody(token)), holder, edits), kRenewAction);
 }
 
-// Puts the token's whole validity at another time, in seconds from now.
+// Sets the token's validity period, in seconds from now.
 AssertionOptions ValidFrom(long start, long end) {
   AssertionOptions options;
   options.beforeSigning = [=](std::string& text) {
@@ -48,7 +36,7 @@ AssertionOptions ValidFrom(long start, long end) {
   return options;
 }
 
-TEST(Renew, GivesANewTokenOfTheSameSubjectKeyAndContent) {
+TEST(RenewTest, IssuesANewTokenWithTheSameSubjectKeyAndContent) {
   const Server server;
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
@@ -59,8 +47,8 @@ TEST(Renew, GivesANewTokenOfTheSameSubjectKeyAndContent) {
   EXPECT_NE(IdOfAssertion(renewed), IdOfAssertion(token));
   for (const char* element : {"saml2:NameID", "ds:KeyInfo", "saml2:AttributeStatement"}) {
     const auto part = [&](const std::string& text) {
-      const std::string behind = text.substr(text.find("<saml2:Subject>"));
-      return ElementText(behind, element);
+      const std::string rest = text.substr(text.find("<saml2:Subject>"));
+      return ElementText(rest, element);
     };
     EXPECT_EQ(part(renewed), part(token)) << element;
     EXPECT_NE(part(renewed), "") << element;
@@ -68,17 +56,17 @@ TEST(Renew, GivesANewTokenOfTheSameSubjectKeyAndContent) {
   EXPECT_TRUE(VerifyXml(renewed, server.SigningCertificatePem()));
 }
 
-TEST(Renew, GrantsTheLifetimeThatIsAskedFor) {
+TEST(RenewTest, GrantsTheRequestedLifetime) {
   const Server server;
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
   const std::string answer = AskToRenew(server, token, holder);
-  // Two hours, where the token had one: only then is it beyond this.
+  // Two hours are requested; the token had one.
   EXPECT_GT(ElementText(answer, "wsu:Expires"), TimeFromNow(7000));
   EXPECT_LT(ElementText(answer, "wsu:Expires"), TimeFromNow(7300));
 }
 
-TEST(Renew, CountsDownToNoMore) {
+TEST(RenewTest, CountsDownToZero) {
   ServerOptions options;
   options.assertion.renewCount = 2;
   const Server server(options);
@@ -92,54 +80,54 @@ TEST(Renew, CountsDownToNoMore) {
               "The RenewTarget may not be renewed any more");
 }
 
-TEST(Renew, RefusesATokenThatIsNotRenewable) {
+TEST(RenewTest, RefusesATokenThatIsNotRenewable) {
   const Server server;
   const Credential holder = Holder();
   const std::string answer =
-      Ask(server, Sign(ByCertificate(holder, Testing::IssueBody("PublicKey", kUseKey),
-                                     Testing::UsernameToken("alice@EXAMPLE.COM", "secret")),
+      Ask(server, Sign(ByCertificate(holder, IssueBody("PublicKey", kUseKey),
+                                     UsernameToken("alice@EXAMPLE.COM", "secret")),
                        holder, {{"Allow=\"true\"", "Allow=\"false\""}}));
   ExpectFault(AskToRenew(server, AssertionIn(answer), holder), "wst:UnableToRenew",
               "The RenewTarget is not renewable");
 }
 
-TEST(Renew, RefusesABearerToken) {
+TEST(RenewTest, RefusesABearerToken) {
   const Server server;
-  const std::string bearer = AssertionIn(Ask(server, Testing::AliceEnvelope()));
+  const std::string bearer = AssertionIn(Ask(server, AliceEnvelope()));
   ExpectFault(AskToRenew(server, bearer, Holder()), "wst:InvalidRequest",
               "The RenewTarget is not a holder-of-key token");
 }
 
-TEST(Renew, RefusesAnotherKeyThanTheTokens) {
+TEST(RenewTest, RefusesAnotherKeyThanTheTokens) {
   const Server server;
   const std::string token = HolderToken(server, Holder());
-  ExpectFault(AskToRenew(server, token, Holder("somebody else")), "wst:FailedAuthentication",
+  ExpectFault(AskToRenew(server, token, Holder("another holder")), "wst:FailedAuthentication",
               "The request is not signed by the key of the RenewTarget");
 }
 
-TEST(Renew, AcceptsANewCertificateOfTheSameKey) {
+TEST(RenewTest, AcceptsANewCertificateOfTheSameKey) {
   const Server server;
   const std::string token = HolderToken(server, Holder());
   EXPECT_THAT(AskToRenew(server, token, Holder()), StartsWith("HTTP/1.1 200"));
 }
 
-TEST(Renew, RefusesUnsignedRequestsAndThoseWithOtherCredentials) {
+TEST(RenewTest, RefusesUnsignedRequestsAndThoseWithOtherCredentials) {
   const Server server;
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
-  const std::string unsignedRequest = Testing::Envelope("", RenewBody(token));
+  const std::string unsignedRequest = Envelope("", RenewBody(token));
   ExpectFault(Ask(server, unsignedRequest, kRenewAction), "wsse:InvalidSecurity",
               "A Renew request must be signed with a certificate");
   const std::string other = HolderToken(server, holder);
   ExpectFault(Ask(server, Sign(ByToken(other, RenewBody(token)), holder), kRenewAction),
               "wsse:InvalidSecurity", "A Renew request must be signed with a certificate");
-  const std::string user = Testing::UsernameToken("alice@EXAMPLE.COM", "secret");
+  const std::string user = UsernameToken("alice@EXAMPLE.COM", "secret");
   ExpectFault(
       Ask(server, Sign(ByCertificate(holder, RenewBody(token), user), holder), kRenewAction),
       "wsse:InvalidSecurity", "A UsernameToken is not expected in a Renew request");
 }
 
-TEST(Renew, RefusesATokenThatIsForgedRevokedOrUnknown) {
+TEST(RenewTest, RefusesATokenThatIsForgedRevokedOrUnknown) {
   ServerOptions options;
   options.issuedTokenLimit = 1;
   Server server(options);
@@ -155,7 +143,7 @@ TEST(Renew, RefusesATokenThatIsForgedRevokedOrUnknown) {
               "The RenewTarget is unknown");
 }
 
-TEST(Renew, RenewsAnExpiredTokenOnlyIfItsRestrictionSaysSo) {
+TEST(RenewTest, RenewsAnExpiredTokenOnlyIfItsRestrictionSaysSo) {
   for (const bool renewExpired : {false, true}) {
     ServerOptions options;
     options.assertion = ValidFrom(-100, -10);
@@ -175,7 +163,7 @@ TEST(Renew, RenewsAnExpiredTokenOnlyIfItsRestrictionSaysSo) {
   }
 }
 
-TEST(Renew, RefusesATokenThatIsNotYetValid) {
+TEST(RenewTest, RefusesATokenThatIsNotYetValid) {
   ServerOptions options;
   options.assertion = ValidFrom(100, 200);
   const Server server(options);
@@ -184,7 +172,7 @@ TEST(Renew, RefusesATokenThatIsNotYetValid) {
               "The RenewTarget is not yet valid");
 }
 
-TEST(Renew, PostdatesATokenOnlyIfItsRestrictionSaysSo) {
+TEST(RenewTest, PostdatesATokenOnlyIfItsRestrictionSaysSo) {
   for (const bool postdatable : {false, true}) {
     ServerOptions options;
     options.assertion.postdatable = postdatable;
@@ -205,7 +193,7 @@ TEST(Renew, PostdatesATokenOnlyIfItsRestrictionSaysSo) {
   }
 }
 
-TEST(Renew, RefusesALifetimeOfNothingAndATypeThatIsNotTheActions) {
+TEST(RenewTest, RefusesALifetimeOfNothingAndATypeThatIsNotTheActions) {
   const Server server;
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
@@ -219,4 +207,4 @@ TEST(Renew, RefusesALifetimeOfNothingAndATypeThatIsNotTheActions) {
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

@@ -1,57 +1,45 @@
-// The signatures of requests as a whole: what they prove, and when.
+// The signatures of requests as a whole: what they prove, and when they are required.
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
+#include <chrono>
+#include <cstddef>
 #include <cstring>
+#include <string>
 
 #include "devsts/server.h"
 #include "expect_fault.h"
 #include "raw_client.h"
 #include "signed_request.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
-using Testing::Ask;
-using Testing::AssertionIn;
-using Testing::ByCertificate;
-using Testing::ByToken;
-using Testing::Edits;
-using Testing::Envelope;
-using Testing::ExpectFault;
-using Testing::Holder;
-using Testing::HolderToken;
-using Testing::IssueBody;
-using Testing::kUseKey;
-using Testing::ProofRequest;
-using Testing::Replaced;
-using Testing::Sign;
 using testing::StartsWith;
-using Testing::TimeFromNow;
-using Testing::UsernameToken;
 
-const Credential& Alices() {
+const Credential& AliceCredential() {
   static const Credential holder = Holder();
   return holder;
 }
 
-ProofRequest AlicesRequest() {
-  return ByCertificate(Alices(), IssueBody("PublicKey", kUseKey),
+ProofRequest AliceRequest() {
+  return ByCertificate(AliceCredential(), IssueBody("PublicKey", kUseKey),
                        UsernameToken("alice@EXAMPLE.COM", "secret"));
 }
 
-TEST(RequestSignature, OfTheCertificateFormIsAccepted) {
+TEST(RequestSignatureTest, OfTheCertificateFormIsAccepted) {
   const Server server;
-  EXPECT_THAT(Ask(server, Sign(AlicesRequest(), Alices())), StartsWith("HTTP/1.1 200"));
+  EXPECT_THAT(Ask(server, Sign(AliceRequest(), AliceCredential())), StartsWith("HTTP/1.1 200"));
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByCertificate);
 }
 
-TEST(RequestSignature, IsSeenOfARefusedRequestToo) {
+TEST(RequestSignatureTest, IsReportedForARefusedRequestToo) {
   const Server server;
-  Ask(server, Sign(AlicesRequest(), Alices(), {{kUseKey, ""}}));
+  Ask(server, Sign(AliceRequest(), AliceCredential(), {{kUseKey, ""}}));
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByCertificate);
-  Ask(server, Sign(AlicesRequest(), Alices(), {{"<wsse:Reference ", "<wsse:Embedded "}}));
+  Ask(server, Sign(AliceRequest(), AliceCredential(), {{"<wsse:Reference ", "<wsse:Embedded "}}));
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::Other);
-  Ask(server, Testing::AliceEnvelope());
+  Ask(server, AliceEnvelope());
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::None);
 }
 
@@ -61,38 +49,40 @@ struct TamperCase {
   const char* to;
 };
 
-class TamperedRequest : public testing::TestWithParam<TamperCase> {};
+class TamperedRequestTest : public testing::TestWithParam<TamperCase> {};
 
-TEST_P(TamperedRequest, FailsTheCheck) {
+TEST_P(TamperedRequestTest, FailsTheCheck) {
   const Server server;
   const TamperCase& test = GetParam();
-  const std::string envelope = Replaced(Sign(AlicesRequest(), Alices()), test.from, test.to);
+  const std::string envelope =
+      Replaced(Sign(AliceRequest(), AliceCredential()), test.from, test.to);
   ExpectFault(Ask(server, envelope), "wsse:FailedCheck",
               "The request's signature does not verify: ");
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryPart, TamperedRequest,
+    EveryPart, TamperedRequestTest,
     testing::Values(TamperCase{"Body", ">true</wst:Delegatable>", ">false</wst:Delegatable>"},
                     TamperCase{"BodyBlank", "<wst:TokenType>", " <wst:TokenType>"},
                     TamperCase{"Timestamp", ".010Z</wsu:Created>", ".010+00:00</wsu:Created>"},
                     TamperCase{"SignatureValue", "<ds:SignatureValue>", "<ds:SignatureValue>AAAA"}),
     [](const auto& test) { return test.param.name; });
 
-TEST(RequestSignature, MustBeByTheCertificatesKey) {
+TEST(RequestSignatureTest, MustBeByTheCertificatesKey) {
   const Server server;
-  ExpectFault(Ask(server, Sign(AlicesRequest(), Holder("somebody else"))), "wsse:FailedCheck",
+  ExpectFault(Ask(server, Sign(AliceRequest(), Holder("another holder"))), "wsse:FailedCheck",
               "The request's signature does not verify: ");
 }
 
-TEST(RequestSignature, MayBeInAnIndentedHeader) {
+TEST(RequestSignatureTest, MayBeInAnIndentedHeader) {
   const Server server;
   const Edits blanks = {{"<wsse:BinarySecurityToken", "\n  <wsse:BinarySecurityToken"},
                         {"<ds:SignedInfo>", "\n<ds:SignedInfo>\n"}};
-  EXPECT_THAT(Ask(server, Sign(AlicesRequest(), Alices(), blanks)), StartsWith("HTTP/1.1 200"));
+  EXPECT_THAT(Ask(server, Sign(AliceRequest(), AliceCredential(), blanks)),
+              StartsWith("HTTP/1.1 200"));
 }
 
-TEST(RequestSignature, OfAWeakOrOtherKeyIsRefused) {
+TEST(RequestSignatureTest, OfAWeakOrOtherKeyIsRefused) {
   const Server server;
   for (const KeyType type : {KeyType::Rsa1024, KeyType::EcP256}) {
     CertificateSpec spec;
@@ -105,7 +95,7 @@ TEST(RequestSignature, OfAWeakOrOtherKeyIsRefused) {
   }
 }
 
-TEST(RequestSignature, ByACertificateOutOfItsTimeIsRefused) {
+TEST(RequestSignatureTest, ByACertificateOutsideItsValidityIsRefused) {
   const Server server;
   for (const long start : {-7200L, 3600L}) {
     CertificateSpec spec;
@@ -128,16 +118,16 @@ struct TimeCase {
   const char* reason;
 };
 
-class SignedTimestamp : public testing::TestWithParam<TimeCase> {};
+class SignedTimestampTest : public testing::TestWithParam<TimeCase> {};
 
-TEST_P(SignedTimestamp, IsRefused) {
+TEST_P(SignedTimestampTest, IsRefused) {
   const Server server;
   const TimeCase& test = GetParam();
   const auto times = [](long created, long expires) {
     return "<wsu:Created>" + TimeFromNow(created) + "</wsu:Created><wsu:Expires>" +
            TimeFromNow(expires) + "</wsu:Expires></wsu:Timestamp>";
   };
-  std::string envelope = Sign(AlicesRequest(), Alices());
+  std::string envelope = Sign(AliceRequest(), AliceCredential());
   const std::size_t from = envelope.find("<wsu:Created>");
   const std::size_t end = envelope.find("</wsu:Timestamp>") + std::strlen("</wsu:Timestamp>");
   envelope.replace(from, end - from, times(test.created, test.expires));
@@ -145,7 +135,7 @@ TEST_P(SignedTimestamp, IsRefused) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryFault, SignedTimestamp,
+    EveryFault, SignedTimestampTest,
     testing::Values(
         TimeCase{"InTheFuture", 120, 720, "wsse:InvalidSecurity", "The Timestamp is in the future"},
         TimeCase{"Expired", -700, -100, "wsu:MessageExpired", "The Timestamp has expired"},
@@ -155,59 +145,59 @@ INSTANTIATE_TEST_SUITE_P(
                  "The signed Timestamp is not valid for ten minutes"}),
     [](const auto& test) { return test.param.name; });
 
-TEST(RequestSignature, IsMissedWhereItsPartsAre) {
+TEST(RequestSignatureTest, IsRequiredIfItsPartsArePresent) {
   const Server server;
-  const ProofRequest request = AlicesRequest();
+  const ProofRequest request = AliceRequest();
   ExpectFault(Ask(server, Envelope(request.tokens, request.body)), "wsse:InvalidSecurity",
               "A token that names a key needs a signature by that key");
   const std::string wsuId =
       " xmlns:wsu=\"http://docs.oasis-open.org/wss/2004/01/"
       "oasis-200401-wss-wssecurity-utility-1.0.xsd\" wsu:Id=\"x\"";
-  ExpectFault(
-      Ask(server, Replaced(Testing::AliceEnvelope(), "<soapenv:Body", "<soapenv:Body" + wsuId)),
-      "wst:InvalidRequest", "Unexpected attribute Id on Body");
+  ExpectFault(Ask(server, Replaced(AliceEnvelope(), "<soapenv:Body", "<soapenv:Body" + wsuId)),
+              "wst:InvalidRequest", "Unexpected attribute Id on Body");
 }
 
-// The subject could have anybody's key bound to somebody's token.
-TEST(RequestSignature, IsNeededForAHolderOfKeyTokenByPasswordWithActAs) {
+// Otherwise a requester could have a key bound to another subject's token without possessing it.
+TEST(RequestSignatureTest, IsNeededForAHolderOfKeyTokenByPasswordWithActAs) {
   const Server server;
   const std::string user = UsernameToken("bob@EXAMPLE.COM", "bob-secret");
-  const std::string alices = AssertionIn(Ask(server, Testing::AliceEnvelope()));
-  ExpectFault(Ask(server, Envelope(user, IssueBody("PublicKey", Testing::ActAs(alices) + kUseKey))),
+  const std::string alices = AssertionIn(Ask(server, AliceEnvelope()));
+  ExpectFault(Ask(server, Envelope(user, IssueBody("PublicKey", ActAs(alices) + kUseKey))),
               "wst:InvalidRequest", "PublicKey tokens are not issued to unsigned requests");
   ExpectFault(Ask(server, Envelope(user, IssueBody("Bearer", kUseKey))), "wst:InvalidRequest",
-              "UseKey names a signature that is not there");
+              "UseKey names a signature that does not exist");
 }
 
-TEST(RequestSignature, OfTheTokenFormIsAccepted) {
+TEST(RequestSignatureTest, OfTheTokenFormIsAccepted) {
   const Server server;
-  const std::string token = HolderToken(server, Alices());
-  EXPECT_THAT(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), Alices())),
+  const std::string token = HolderToken(server, AliceCredential());
+  EXPECT_THAT(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), AliceCredential())),
               StartsWith("HTTP/1.1 200"));
   EXPECT_EQ(server.LastRequest().signature, RequestSignature::ByToken);
 }
 
-TEST(RequestSignature, OfTheTokenFormMustBeByTheTokensKey) {
+TEST(RequestSignatureTest, OfTheTokenFormMustBeByTheTokensKey) {
   const Server server;
-  const std::string token = HolderToken(server, Alices());
-  ExpectFault(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), Holder("somebody else"))),
+  const std::string token = HolderToken(server, AliceCredential());
+  ExpectFault(Ask(server, Sign(ByToken(token, IssueBody("PublicKey")), Holder("another holder"))),
               "wsse:FailedCheck", "The request's signature does not verify: ");
 }
 
-TEST(RequestSignature, OfTheTokenFormNeedsAHolderOfKeyToken) {
+TEST(RequestSignatureTest, OfTheTokenFormNeedsAHolderOfKeyToken) {
   const Server server;
-  const std::string bearer = AssertionIn(Ask(server, Testing::AliceEnvelope()));
-  ExpectFault(Ask(server, Sign(ByToken(bearer, IssueBody("PublicKey")), Alices())),
+  const std::string bearer = AssertionIn(Ask(server, AliceEnvelope()));
+  ExpectFault(Ask(server, Sign(ByToken(bearer, IssueBody("PublicKey")), AliceCredential())),
               "wsse:InvalidSecurityToken", "The presented token is not a holder-of-key token");
 }
 
-TEST(RequestSignature, OfTheCertificateFormHasNoAssertionBeside) {
+TEST(RequestSignatureTest, OfTheCertificateFormRefusesAnAssertion) {
   const Server server;
-  const std::string token = HolderToken(server, Alices());
-  const ProofRequest request = ByCertificate(Alices(), IssueBody("PublicKey", kUseKey), token);
-  ExpectFault(Ask(server, Sign(request, Alices())), "wsse:InvalidSecurity",
-              "An assertion is not expected beside a BinarySecurityToken");
+  const std::string token = HolderToken(server, AliceCredential());
+  const ProofRequest request =
+      ByCertificate(AliceCredential(), IssueBody("PublicKey", kUseKey), token);
+  ExpectFault(Ask(server, Sign(request, AliceCredential())), "wsse:InvalidSecurity",
+              "An assertion is not expected together with a BinarySecurityToken");
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

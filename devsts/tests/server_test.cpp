@@ -1,28 +1,26 @@
 #include "devsts/server.h"
 
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <functional>
+#include <memory>
+#include <stdexcept>
+#include <string>
+#include <vector>
 
 #include "raw_client.h"
 #include "request_text.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
-using Testing::ActAs;
-using Testing::AliceEnvelope;
 using testing::AllOf;
-using Testing::AssertionIn;
-using Testing::ElementText;
 using testing::HasSubstr;
 using testing::IsEmpty;
-using Testing::IssueEnvelope;
-using Testing::kIssueAction;
 using testing::Not;
-using Testing::PostOf;
-using Testing::RawClient;
-using Testing::Replaced;
 using testing::StartsWith;
-using Testing::TimeFromNow;
 
 std::string Ask(const Server& server, const std::string& octets) {
   RawClient client(server.HttpPort());
@@ -34,7 +32,7 @@ std::string AskFor(const Server& server, const std::string& envelope) {
   return Ask(server, PostOf(envelope, kIssueAction));
 }
 
-TEST(Server, IssuesAnAssertionThatVerifiesInItsPlace) {
+TEST(ServerTest, IssuesAnAssertionThatVerifiesInTheEnvelope) {
   const Server server;
   const std::string answer = AskFor(server, AliceEnvelope());
   ASSERT_THAT(answer, StartsWith("HTTP/1.1 200 OK\r\n"));
@@ -46,7 +44,7 @@ TEST(Server, IssuesAnAssertionThatVerifiesInItsPlace) {
   EXPECT_TRUE(VerifyXml(AssertionIn(answer), server.SigningCertificatePem()));
 }
 
-TEST(Server, LaysTheAnswerOutAsTheProtocolSays) {
+TEST(ServerTest, LaysOutTheAnswerAsTheProtocolRequires) {
   const Server server;
   const std::string answer = AskFor(server, AliceEnvelope());
   EXPECT_EQ(ElementText(answer, "wst:TokenType"), "urn:oasis:names:tc:SAML:2.0:assertion");
@@ -72,7 +70,7 @@ TEST(Server, LaysTheAnswerOutAsTheProtocolSays) {
   }
 }
 
-TEST(Server, PutsTheUserIntoTheAssertion) {
+TEST(ServerTest, PutsTheUserIntoTheAssertion) {
   const Server server;
   const std::string alice = AssertionIn(AskFor(server, AliceEnvelope()));
   EXPECT_EQ(ElementText(alice, "saml2:NameID"), "alice@EXAMPLE.COM");
@@ -86,7 +84,7 @@ TEST(Server, PutsTheUserIntoTheAssertion) {
   EXPECT_THAT(machine, AllOf(HasSubstr(">true<"), Not(HasSubstr("givenname"))));
 }
 
-TEST(Server, GrantsWhatWasAskedFor) {
+TEST(ServerTest, GrantsWhatIsRequested) {
   const Server server;
   const std::string more =
       "<wst:DelegateTo><wsse:UsernameToken xmlns:wsse=\"http://docs.oasis-open.org/wss/2004/01/"
@@ -114,7 +112,7 @@ TEST(Server, GrantsWhatWasAskedFor) {
   EXPECT_TRUE(VerifyXml(assertion, server.SigningCertificatePem()));
 }
 
-TEST(Server, GrantsNoMoreThanWasAskedFor) {
+TEST(ServerTest, GrantsNoMoreThanIsRequested) {
   const Server server;
   std::string envelope = Replaced(AliceEnvelope(), "Allow=\"true\"", "Allow=\"false\"");
   envelope = Replaced(envelope, ">true</wst:Delegatable>", ">false</wst:Delegatable>");
@@ -126,7 +124,7 @@ TEST(Server, GrantsNoMoreThanWasAskedFor) {
   }
 }
 
-TEST(Server, ActsAsTheSubjectOfADelegableToken) {
+TEST(ServerTest, ActsAsTheSubjectOfADelegableToken) {
   const Server server;
   const std::string alices = AssertionIn(AskFor(server, AliceEnvelope()));
   const std::string bobs =
@@ -135,7 +133,7 @@ TEST(Server, ActsAsTheSubjectOfADelegableToken) {
   EXPECT_THAT(ElementText(bobs, "del:Delegate"), HasSubstr(">bob@EXAMPLE.COM</saml2:NameID>"));
 }
 
-TEST(Server, RefusesAnActAsTokenThatWasTamperedWith) {
+TEST(ServerTest, RefusesATamperedActAsToken) {
   const Server server;
   const std::string alices = AssertionIn(AskFor(server, AliceEnvelope()));
   const std::string forged = Replaced(alices, "alice@EXAMPLE.COM", "carol@EXAMPLE.COM");
@@ -146,7 +144,7 @@ TEST(Server, RefusesAnActAsTokenThatWasTamperedWith) {
               StartsWith("The ActAs token's signature does not verify"));
 }
 
-TEST(Server, RefusesAnActAsTokenThatIsNotDelegable) {
+TEST(ServerTest, RefusesAnActAsTokenThatIsNotDelegable) {
   const Server server;
   const std::string alices = AssertionIn(AskFor(
       server, Replaced(AliceEnvelope(), ">true</wst:Delegatable>", ">false</wst:Delegatable>")));
@@ -161,9 +159,9 @@ struct ShapeCase {
   AssertionOptions options;
 };
 
-class ShapeOf : public testing::TestWithParam<ShapeCase> {};
+class AssertionShapeTest : public testing::TestWithParam<ShapeCase> {};
 
-TEST_P(ShapeOf, HoldsInTheEnvelope) {
+TEST_P(AssertionShapeTest, VerifiesInTheEnvelope) {
   ServerOptions options;
   options.assertion = GetParam().options;
   const Server server(options);
@@ -180,7 +178,7 @@ AssertionOptions With(const std::function<void(AssertionOptions&)>& change) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryShape, ShapeOf,
+    EveryShape, AssertionShapeTest,
     testing::Values(
         ShapeCase{"InheritedNamespaces", With([](auto& o) { o.inheritNamespaces = true; })},
         ShapeCase{"InheritedNamespacesInclusive", With([](auto& o) {
@@ -197,7 +195,7 @@ INSTANTIATE_TEST_SUITE_P(
         ShapeCase{"NoKeyInfo", With([](auto& o) { o.signing.keyInfo = KeyInfoContent::None; })}),
     [](const auto& test) { return test.param.name; });
 
-TEST(Server, SignsWhatTheFirstHookMadeAndBreaksWithTheSecond) {
+TEST(ServerTest, SignsAfterTheFirstHookAndBeforeTheSecond) {
   Server server;
   AssertionOptions options;
   options.beforeSigning = [](std::string& text) { text = Replaced(text, "Alice", "Alicia"); };
@@ -212,7 +210,7 @@ TEST(Server, SignsWhatTheFirstHookMadeAndBreaksWithTheSecond) {
   EXPECT_FALSE(VerifyXml(forged, server.SigningCertificatePem()));
 }
 
-TEST(Server, RefusesBadCredentials) {
+TEST(ServerTest, RefusesBadCredentials) {
   const Server server;
   for (const char* user : {"alice@EXAMPLE.COM", "nobody@EXAMPLE.COM"}) {
     const std::string answer = AskFor(server, IssueEnvelope(user, "wrong"));
@@ -222,7 +220,7 @@ TEST(Server, RefusesBadCredentials) {
   }
 }
 
-TEST(Server, TellsThatThePasswordHasExpired) {
+TEST(ServerTest, ReportsAnExpiredPassword) {
   const Server server;
   const std::string answer = AskFor(server, IssueEnvelope("expired@EXAMPLE.COM", "expired-secret"));
   EXPECT_EQ(ElementText(answer, "faultcode"), "wst:FailedAuthentication");
@@ -238,9 +236,9 @@ struct RefusedCase {
   const char* reason;
 };
 
-class RefusedRequest : public testing::TestWithParam<RefusedCase> {};
+class RefusedRequestTest : public testing::TestWithParam<RefusedCase> {};
 
-TEST_P(RefusedRequest, SaysExactlyWhatIsWrong) {
+TEST_P(RefusedRequestTest, SaysExactlyWhatIsWrong) {
   const Server server;
   const RefusedCase& test = GetParam();
   const std::string answer =
@@ -251,7 +249,7 @@ TEST_P(RefusedRequest, SaysExactlyWhatIsWrong) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryPart, RefusedRequest,
+    EveryPart, RefusedRequestTest,
     testing::Values(
         RefusedCase{"NotWellFormed", "</soapenv:Envelope>", "", "wst:InvalidRequest",
                     "The request is not well-formed: line 1"},
@@ -292,7 +290,7 @@ INSTANTIATE_TEST_SUITE_P(
                     "wst:InvalidRequest", "Unexpected text in RequestSecurityToken"}),
     [](const auto& test) { return test.param.name; });
 
-TEST(Server, RefusesAStaleTimestamp) {
+TEST(ServerTest, RefusesAStaleTimestamp) {
   const Server server;
   const std::string envelope = AliceEnvelope();
   const std::size_t end = envelope.find("</wsu:Timestamp>");
@@ -317,9 +315,9 @@ struct HeadCase {
   const char* reason;
 };
 
-class RefusedHead : public testing::TestWithParam<HeadCase> {};
+class RefusedHttpHeadTest : public testing::TestWithParam<HeadCase> {};
 
-TEST_P(RefusedHead, SaysExactlyWhatIsWrong) {
+TEST_P(RefusedHttpHeadTest, SaysExactlyWhatIsWrong) {
   const Server server;
   const HeadCase& test = GetParam();
   const std::string answer =
@@ -329,7 +327,7 @@ TEST_P(RefusedHead, SaysExactlyWhatIsWrong) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryField, RefusedHead,
+    EveryField, RefusedHttpHeadTest,
     testing::Values(HeadCase{"Method", "POST", "PUT", "The method is not POST but PUT"},
                     HeadCase{"ContentType", "text/xml", "application/soap+xml",
                              "Content-Type is not text/xml but application/soap+xml"},
@@ -342,7 +340,7 @@ INSTANTIATE_TEST_SUITE_P(
                              "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Cancel"}),
     [](const auto& test) { return test.param.name; });
 
-TEST(Server, KeepsALogOfRequests) {
+TEST(ServerTest, KeepsALogOfRequests) {
   Server server;
   EXPECT_THROW(server.LastRequest(), std::out_of_range);
   RawClient client(server.HttpPort());
@@ -370,7 +368,7 @@ TEST(Server, KeepsALogOfRequests) {
   EXPECT_THAT(server.Requests(), IsEmpty());
 }
 
-TEST(Server, CountsWhatIsNotHttp) {
+TEST(ServerTest, CountsInputThatIsNotHttp) {
   const Server server;
   RawClient client(server.HttpPort());
   client.Send("hello\r\n\r\n");
@@ -380,7 +378,7 @@ TEST(Server, CountsWhatIsNotHttp) {
   }));
 }
 
-TEST(Server, ListensOnTheOtherLoopbackAddress) {
+TEST(ServerTest, ListensOnTheOtherLoopbackAddress) {
   ServerOptions options;
   options.address = "::1";
   const Server server(options);
@@ -390,7 +388,7 @@ TEST(Server, ListensOnTheOtherLoopbackAddress) {
   EXPECT_THAT(client.ReadAnswer(), StartsWith("HTTP/1.1 200"));
 }
 
-TEST(Server, StopsWithIdleConnectionsOpen) {
+TEST(ServerTest, StopsWithIdleConnectionsOpen) {
   auto server = std::make_unique<Server>();
   RawClient idle(server->HttpPort());
   RawClient halfway(server->HttpPort());
@@ -403,4 +401,4 @@ TEST(Server, StopsWithIdleConnectionsOpen) {
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

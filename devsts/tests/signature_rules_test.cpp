@@ -1,41 +1,27 @@
-// What the service refuses of a request's signature, one rule at a time.
+// The rules for a request's signature, each broken on its own.
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
-#include <cstring>
+#include <string>
 
 #include "devsts/server.h"
 #include "expect_fault.h"
 #include "raw_client.h"
 #include "signed_request.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
-
-using Testing::Ask;
-using Testing::ByCertificate;
-using Testing::ByToken;
-using Testing::Edits;
-using Testing::ExpectFault;
-using Testing::Holder;
-using Testing::HolderToken;
-using Testing::IssueBody;
-using Testing::kTimestampId;
-using Testing::kUseKey;
-using Testing::ProofRequest;
-using Testing::ReferenceTo;
-using Testing::Sign;
-using Testing::UsernameToken;
 
 constexpr char kExclusive[] = "Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"";
 constexpr char kInclusive[] = "Algorithm=\"http://www.w3.org/TR/2001/REC-xml-c14n-20010315\"";
 
-const Credential& Alices() {
+const Credential& AliceCredential() {
   static const Credential holder = Holder();
   return holder;
 }
 
-ProofRequest AlicesRequest() {
-  return ByCertificate(Alices(), IssueBody("PublicKey", kUseKey),
+ProofRequest AliceRequest() {
+  return ByCertificate(AliceCredential(), IssueBody("PublicKey", kUseKey),
                        UsernameToken("alice@EXAMPLE.COM", "secret"));
 }
 
@@ -50,12 +36,13 @@ std::string NameOf(const testing::TestParamInfo<RuleCase>& test) {
   return test.param.name;
 }
 
-class CertificateForm : public testing::TestWithParam<RuleCase> {};
+class CertificateFormTest : public testing::TestWithParam<RuleCase> {};
 
-TEST_P(CertificateForm, RefusesWhatBreaksOneRule) {
+TEST_P(CertificateFormTest, RefusesWhatBreaksOneRule) {
   const Server server;
   const RuleCase& rule = GetParam();
-  ExpectFault(Ask(server, Sign(AlicesRequest(), Alices(), rule.edits)), rule.code, rule.reason);
+  ExpectFault(Ask(server, Sign(AliceRequest(), AliceCredential(), rule.edits)), rule.code,
+              rule.reason);
 }
 
 std::string Algorithm(const char* uri) {
@@ -63,7 +50,7 @@ std::string Algorithm(const char* uri) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Signature, CertificateForm,
+    Signature, CertificateFormTest,
     testing::Values(RuleCase{"NotTheLastElement",
                              {{"</ds:Signature>", "</ds:Signature><wsse:Other/>"}},
                              "wsse:InvalidSecurity",
@@ -102,7 +89,7 @@ INSTANTIATE_TEST_SUITE_P(
     NameOf);
 
 INSTANTIATE_TEST_SUITE_P(
-    References, CertificateForm,
+    References, CertificateFormTest,
     testing::Values(RuleCase{"TimestampBeforeBody",
                              {{"URI=\"#Body-1\"", "URI=\"#x\""},
                               {"URI=\"#Timestamp-1\"", "URI=\"#Body-1\""},
@@ -143,7 +130,7 @@ INSTANTIATE_TEST_SUITE_P(
     NameOf);
 
 INSTANTIATE_TEST_SUITE_P(
-    Algorithms, CertificateForm,
+    Algorithms, CertificateFormTest,
     testing::Values(
         RuleCase{"InclusiveSignedInfo",
                  {{kExclusive, kInclusive}},
@@ -179,7 +166,7 @@ INSTANTIATE_TEST_SUITE_P(
     NameOf);
 
 INSTANTIATE_TEST_SUITE_P(
-    KeyInfo, CertificateForm,
+    KeyInfo, CertificateFormTest,
     testing::Values(
         RuleCase{"OtherReferenceUri",
                  {{"URI=\"#holderOfKeyCertificate\"", "URI=\"#Body-1\""}},
@@ -205,11 +192,11 @@ INSTANTIATE_TEST_SUITE_P(
         RuleCase{"NoCertificate",
                  {{">MII", ">NII"}},
                  "wsse:InvalidSecurityToken",
-                 "The BinarySecurityToken holds no certificate: "},
-        RuleCase{"OctetsBehindTheCertificate",
+                 "The BinarySecurityToken contains no certificate: "},
+        RuleCase{"OctetsAfterTheCertificate",
                  {{"</wsse:BinarySecurityToken>", "AAAA</wsse:BinarySecurityToken>"}},
                  "wsse:InvalidSecurityToken",
-                 "The BinarySecurityToken holds no certificate: "},
+                 "The BinarySecurityToken contains no certificate: "},
         RuleCase{"NoBinarySecurityToken",
                  {{"<wsse:BinarySecurityToken ", "<!--"}, {"</wsse:BinarySecurityToken>", "-->"}},
                  "wsse:InvalidSecurity",
@@ -230,34 +217,34 @@ INSTANTIATE_TEST_SUITE_P(
     NameOf);
 
 INSTANTIATE_TEST_SUITE_P(
-    UseKey, CertificateForm,
+    UseKey, CertificateFormTest,
     testing::Values(RuleCase{"Missing", {{kUseKey, ""}}, "wst:InvalidRequest", "UseKey is missing"},
                     RuleCase{"NamesNoSignature",
                              {{"Sig=\"holderOfKeyProofSignature\"", "Sig=\"other\""}},
                              "wst:InvalidRequest",
                              "UseKey/@Sig does not name the request's signature: other"},
-                    RuleCase{"BesideDelegateTo",
-                             {{kUseKey, Testing::DelegateTo("bob@EXAMPLE.COM") + kUseKey}},
+                    RuleCase{"WithDelegateTo",
+                             {{kUseKey, DelegateTo("bob@EXAMPLE.COM") + kUseKey}},
                              "wst:InvalidRequest",
-                             "UseKey is not expected beside DelegateTo"},
+                             "UseKey is not expected together with DelegateTo"},
                     RuleCase{"ForABearerToken",
                              {{"/PublicKey<", "/Bearer<"}},
                              "wst:InvalidRequest",
                              "A request signed with a certificate must ask for a PublicKey token"}),
     NameOf);
 
-class TokenForm : public testing::TestWithParam<RuleCase> {};
+class TokenFormTest : public testing::TestWithParam<RuleCase> {};
 
-TEST_P(TokenForm, RefusesWhatBreaksOneRule) {
+TEST_P(TokenFormTest, RefusesWhatBreaksOneRule) {
   const Server server;
-  const std::string token = HolderToken(server, Alices());
+  const std::string token = HolderToken(server, AliceCredential());
   const ProofRequest request = ByToken(token, IssueBody("PublicKey"));
   const RuleCase& rule = GetParam();
-  ExpectFault(Ask(server, Sign(request, Alices(), rule.edits)), rule.code, rule.reason);
+  ExpectFault(Ask(server, Sign(request, AliceCredential(), rule.edits)), rule.code, rule.reason);
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    KeyInfo, TokenForm,
+    KeyInfo, TokenFormTest,
     testing::Values(
         RuleCase{"HyphenInTheTokenType",
                  {{"saml-tokenprofile-1.1#SAMLV2.0", "saml-token-profile-1.1#SAMLV2.0"}},
@@ -277,7 +264,7 @@ INSTANTIATE_TEST_SUITE_P(
                  {{"</wsse:KeyIdentifier>", "0</wsse:KeyIdentifier>"}},
                  "wsse:InvalidSecurity",
                  "The KeyIdentifier names no assertion of the header: _"},
-        RuleCase{"UsernameTokenBeside",
+        RuleCase{"WithUsernameToken",
                  {{"<saml2:Assertion", UsernameToken("bob@EXAMPLE.COM", "x") + "<saml2:Assertion"}},
                  "wsse:InvalidSecurity",
                  "An assertion that proves the key must be the only token"},
@@ -288,4 +275,4 @@ INSTANTIATE_TEST_SUITE_P(
     NameOf);
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

@@ -66,7 +66,7 @@ std::string RsaSha256Of(const std::string& text, const std::string& keyPem) {
   return Base64(value);
 }
 
-// The PEM's own Base64 is that of the certificate's octets.
+// The Base64 lines of the PEM encode the certificate's octets.
 std::string Base64Of(const std::string& certificatePem) {
   std::string text;
   for (std::size_t at = 0; at < certificatePem.size();) {

@@ -1,9 +1,12 @@
-// What SPNEGO's messages are like that the service reads itself, and that no other does it harm.
-#include "spnego_token.h"
-
+// The parts of SPNEGO messages that the service reads itself, and its safety against malformed
+// ones.
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
+#include <cstddef>
 #include <functional>
+
+#include "kerberos/spnego_token.h"
 
 namespace DevSts::Testing {
 namespace {
@@ -26,7 +29,7 @@ Octets Joined(Octets left, const Octets& right) {
   return left;
 }
 
-// A NegTokenInit (RFC 4178, section 4.2.1) with a leg of Kerberos's.
+// A NegTokenInit (RFC 4178, section 4.2.1) with a message of Kerberos.
 Octets FirstLeg() {
   const Octets token = Element(0xa2, Element(0x04, {0xde, 0xad}));
   const Octets fields = Joined(Element(0xa0, kMechTypes), token);
@@ -48,7 +51,7 @@ TEST(SpnegoTokenTest, FindsTheMicThatItAdds) {
   EXPECT_THAT(MicIn(Answer()), IsEmpty());
   const Octets answer = WithMic(Answer(), NegState::AcceptIncomplete, kMic);
   EXPECT_EQ(MicIn(answer), kMic);
-  // The state is the new one, and what stood behind the old one stands there still.
+  // The state is replaced, and the fields after it are unchanged.
   EXPECT_EQ(answer, Element(0xa1, Element(0x30, Joined(Joined(Element(0xa0, {0x0a, 0x01, 0x01}),
                                                               Element(0xa2, {0x04, 0x01, 9})),
                                                        Element(0xa3, Element(0x04, kMic))))));
@@ -63,7 +66,7 @@ TEST(SpnegoTokenTest, WritesLongLengthsThatItReads) {
 
 using Reader = std::function<void(const Octets&)>;
 
-// Hands the reader memory of exactly the message's size, so that a read behind its end is seen.
+// Passes memory of exactly the message's size, so that sanitizers detect a read past its end.
 bool IsRefused(const Octets& octets, const Reader& reader) {
   const Octets exact(octets.begin(), octets.end());
   try {

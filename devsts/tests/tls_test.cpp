@@ -1,19 +1,17 @@
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <openssl/x509_vfy.h>
 
 #include <memory>
+#include <string>
 
 #include "devsts/server.h"
 #include "raw_client.h"
 #include "request_text.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
-using Testing::AliceEnvelope;
-using Testing::kIssueAction;
-using Testing::PostOf;
-using Testing::RawClient;
 using testing::StartsWith;
 
 struct CertificateCase {
@@ -23,9 +21,9 @@ struct CertificateCase {
   long verdict;
 };
 
-class ServerCertificateIs : public testing::TestWithParam<CertificateCase> {};
+class ServerCertificateTest : public testing::TestWithParam<CertificateCase> {};
 
-TEST_P(ServerCertificateIs, JudgedSoByOpenSsl) {
+TEST_P(ServerCertificateTest, HasTheExpectedOpenSslResult) {
   ServerOptions options;
   options.tls.certificate = GetParam().certificate;
   options.tls.dnsNames = {"*.example.com"};
@@ -36,7 +34,7 @@ TEST_P(ServerCertificateIs, JudgedSoByOpenSsl) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryKind, ServerCertificateIs,
+    EveryKind, ServerCertificateTest,
     testing::Values(
         CertificateCase{"ValidByAddress", ServerCertificate::Valid, "127.0.0.1", X509_V_OK},
         CertificateCase{"ValidByName", ServerCertificate::Valid, "localhost", X509_V_OK},
@@ -58,20 +56,20 @@ INSTANTIATE_TEST_SUITE_P(
                         X509_V_ERR_IP_ADDRESS_MISMATCH},
         CertificateCase{"NulInName", ServerCertificate::NulInName, "localhost",
                         X509_V_ERR_HOSTNAME_MISMATCH},
-        CertificateCase{"WildcardThatFits", ServerCertificate::Custom, "sts.example.com",
+        CertificateCase{"WildcardThatMatches", ServerCertificate::Custom, "sts.example.com",
                         X509_V_OK},
         CertificateCase{"WildcardOfOneLabelOnly", ServerCertificate::Custom, "a.sts.example.com",
                         X509_V_ERR_HOSTNAME_MISMATCH}),
     [](const auto& test) { return test.param.name; });
 
-TEST(Tls, OneServersAuthorityIsNotAnothers) {
+TEST(TlsTest, AnotherServersAuthorityIsNotTrusted) {
   const Server server;
   const Server other;
   RawClient client(server.HttpsPort());
   EXPECT_NE(client.StartTls(other.CaCertificatePem()), X509_V_OK);
 }
 
-TEST(Tls, RefusesModernClientsOverOldProtocols) {
+TEST(TlsTest, RefusesModernClientsOverOldProtocols) {
   for (const TlsProtocol protocol : {TlsProtocol::Tls11Only, TlsProtocol::AnonymousSuites}) {
     ServerOptions options;
     options.tls.protocol = protocol;
@@ -83,7 +81,7 @@ TEST(Tls, RefusesModernClientsOverOldProtocols) {
   }
 }
 
-// What a careless client would do: the server must really speak it, or the refusals prove nothing.
+// The handshake of a careless client. The server must support it, or the refusals prove nothing.
 bool CarelessHandshake(const Server& server, int version, const char* ciphers) {
   const std::shared_ptr<SSL_CTX> context(SSL_CTX_new(TLS_client_method()), SSL_CTX_free);
   SSL_CTX_set_min_proto_version(context.get(), version);
@@ -95,7 +93,7 @@ bool CarelessHandshake(const Server& server, int version, const char* ciphers) {
   return BIO_do_handshake(bio.get()) == 1;
 }
 
-TEST(Tls, SpeaksOldProtocolsToCarelessClients) {
+TEST(TlsTest, SpeaksOldProtocolsToCarelessClients) {
   ServerOptions options;
   options.tls.protocol = TlsProtocol::Tls11Only;
   const Server old(options);
@@ -110,20 +108,20 @@ std::string Ask(RawClient& client) {
   return client.ReadAnswer();
 }
 
-TEST(Tls, RequiresAClientCertificate) {
+TEST(TlsTest, RequiresAClientCertificate) {
   ServerOptions options;
   options.tls.requireClientCertificate = true;
   const Server server(options);
-  RawClient nobody(server.HttpsPort());
-  nobody.StartTls(server.CaCertificatePem());
+  RawClient anonymous(server.HttpsPort());
+  anonymous.StartTls(server.CaCertificatePem());
   EXPECT_TRUE(
       server.WaitUntil([](const Counters& counters) { return counters.handshakesFailed == 1; }));
 
   const Credential credential = server.MakeClientCredential("client one");
-  RawClient somebody(server.HttpsPort());
-  somebody.UseClientCredential(credential.certificatePem, credential.privateKeyPem);
-  ASSERT_EQ(somebody.StartTls(server.CaCertificatePem()), X509_V_OK);
-  EXPECT_THAT(Ask(somebody), StartsWith("HTTP/1.1 200 "));
+  RawClient identified(server.HttpsPort());
+  identified.UseClientCredential(credential.certificatePem, credential.privateKeyPem);
+  ASSERT_EQ(identified.StartTls(server.CaCertificatePem()), X509_V_OK);
+  EXPECT_THAT(Ask(identified), StartsWith("HTTP/1.1 200 "));
   EXPECT_EQ(server.LastRequest().peerCertificatePem, credential.certificatePem);
 }
 
@@ -141,7 +139,7 @@ bool ResumesOnSecondConnection(const Server& server) {
   return server.LastRequest().tlsSessionReused;
 }
 
-TEST(Tls, ResumesSessions) {
+TEST(TlsTest, ResumesSessions) {
   for (const TlsProtocol protocol : {TlsProtocol::Modern, TlsProtocol::Tls12Only}) {
     ServerOptions options;
     options.tls.protocol = protocol;
@@ -153,7 +151,7 @@ TEST(Tls, ResumesSessions) {
   }
 }
 
-TEST(Tls, DoesNotResumeWhenToldNotTo) {
+TEST(TlsTest, DoesNotResumeWhenToldNotTo) {
   ServerOptions options;
   options.tls.sessionResumption = false;
   const Server server(options);
@@ -161,4 +159,4 @@ TEST(Tls, DoesNotResumeWhenToldNotTo) {
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

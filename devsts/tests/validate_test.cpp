@@ -1,26 +1,19 @@
-// The verdicts of the Validate binding.
+// The results of the Validate operation.
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <string>
 
 #include "devsts/server.h"
 #include "raw_client.h"
 #include "signed_request.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
-using Testing::Ask;
-using Testing::AssertionIn;
-using Testing::ElementText;
-using Testing::Envelope;
-using Testing::Holder;
-using Testing::HolderToken;
-using Testing::IdOfAssertion;
 using testing::IsEmpty;
-using Testing::kValidateAction;
-using Testing::Replaced;
 using testing::StartsWith;
-using Testing::TimeFromNow;
-using Testing::ValidateBody;
 
 constexpr char kValid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid";
 constexpr char kInvalid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid";
@@ -35,10 +28,10 @@ void ExpectInvalid(const std::string& answer, const std::string& reason) {
   EXPECT_THAT(ElementText(answer, "wst:Reason"), StartsWith(reason));
 }
 
-TEST(Validate, FindsIssuedTokensValid) {
+TEST(ValidateTest, FindsIssuedTokensValid) {
   const Server server;
   for (const std::string& token :
-       {AssertionIn(Ask(server, Testing::AliceEnvelope())), HolderToken(server, Holder())}) {
+       {AssertionIn(Ask(server, AliceEnvelope())), HolderToken(server, Holder())}) {
     const std::string answer = AskAbout(server, token);
     EXPECT_THAT(answer, StartsWith("HTTP/1.1 200 OK\r\n"));
     EXPECT_EQ(ElementText(answer, "wst:TokenType"),
@@ -49,28 +42,28 @@ TEST(Validate, FindsIssuedTokensValid) {
   EXPECT_EQ(server.GetCounters().tokensIssued, 2U);
 }
 
-TEST(Validate, SaysWhyATokenIsInvalid) {
+TEST(ValidateTest, SaysWhyATokenIsInvalid) {
   ServerOptions options;
   options.issuedTokenLimit = 1;
   Server server(options);
-  const std::string token = AssertionIn(Ask(server, Testing::AliceEnvelope()));
+  const std::string token = AssertionIn(Ask(server, AliceEnvelope()));
   ExpectInvalid(AskAbout(server, Replaced(token, "alice@", "carol@")),
                 "The token's signature does not verify: ");
-  ExpectInvalid(AskAbout(server, Testing::WithoutSignature(token)), "The token has no signature");
+  ExpectInvalid(AskAbout(server, WithoutSignature(token)), "The token has no signature");
   ASSERT_TRUE(server.Revoke(IdOfAssertion(token)));
   ExpectInvalid(AskAbout(server, token), "The token was revoked");
-  Ask(server, Testing::AliceEnvelope());
+  Ask(server, AliceEnvelope());
   ExpectInvalid(AskAbout(server, token), "The token is unknown");
 }
 
-TEST(Validate, FindsAnUnreadableTokenInvalid) {
+TEST(ValidateTest, FindsAnUnreadableTokenInvalid) {
   const Server server;
   const std::string bare =
       "<s:Assertion xmlns:s=\"urn:oasis:names:tc:SAML:2.0:assertion\" ID=\"_1\"/>";
   ExpectInvalid(AskAbout(server, bare), "The token has no Subject");
 }
 
-TEST(Validate, FindsATokenOutOfItsTimeInvalid) {
+TEST(ValidateTest, FindsATokenOutsideItsValidityInvalid) {
   for (const long start : {-200L, 100L}) {
     ServerOptions options;
     options.assertion.beforeSigning = [start](std::string& text) {
@@ -80,27 +73,26 @@ TEST(Validate, FindsATokenOutOfItsTimeInvalid) {
                        TimeFromNow(start + 100) + "\"");
     };
     const Server server(options);
-    const std::string token = AssertionIn(Ask(server, Testing::AliceEnvelope()));
+    const std::string token = AssertionIn(Ask(server, AliceEnvelope()));
     ExpectInvalid(AskAbout(server, token),
                   start < 0 ? "The token has expired" : "The token is not yet valid");
   }
 }
 
-TEST(Validate, RefusesCredentialsAndSignatures) {
+TEST(ValidateTest, RefusesCredentialsAndSignatures) {
   const Server server;
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
-  const std::string user = Testing::UsernameToken("alice@EXAMPLE.COM", "secret");
+  const std::string user = UsernameToken("alice@EXAMPLE.COM", "secret");
   EXPECT_EQ(
       ElementText(Ask(server, Envelope(user, ValidateBody(token)), kValidateAction), "faultstring"),
       "A UsernameToken is not expected in a Validate request");
-  const std::string proven =
-      Testing::Sign(Testing::ByCertificate(holder, ValidateBody(token)), holder);
+  const std::string proven = Sign(ByCertificate(holder, ValidateBody(token)), holder);
   EXPECT_EQ(ElementText(Ask(server, proven, kValidateAction), "faultstring"),
             "A Signature is not expected in a Validate request");
 }
 
-TEST(Validate, RefusesAnythingButAnAssertion) {
+TEST(ValidateTest, RefusesAnythingButAnAssertion) {
   const Server server;
   const std::string answer = AskAbout(server, "<x xmlns=\"urn:x\"/>");
   EXPECT_EQ(ElementText(answer, "faultcode"), "wst:InvalidRequest");
@@ -110,4 +102,4 @@ TEST(Validate, RefusesAnythingButAnAssertion) {
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

@@ -1,13 +1,16 @@
 #include "devsts/xml_security.h"
 
 #include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
+#include <cstddef>
+#include <string>
 #include <thread>
 #include <vector>
 
 #include "devsts/certificates.h"
 
-namespace DevSts {
+namespace DevSts::Testing {
 namespace {
 
 using testing::ElementsAre;
@@ -44,7 +47,7 @@ struct AlgorithmCase {
   CanonicalMode canonicalization;
 };
 
-class SignatureOf : public testing::TestWithParam<AlgorithmCase> {
+class SignatureAlgorithmTest : public testing::TestWithParam<AlgorithmCase> {
  protected:
   static std::string SignedText() {
     SignOptions options;
@@ -55,28 +58,28 @@ class SignatureOf : public testing::TestWithParam<AlgorithmCase> {
   }
 };
 
-TEST_P(SignatureOf, Verifies) {
+TEST_P(SignatureAlgorithmTest, Verifies) {
   const VerifyResult result = VerifyXml(SignedText(), Make(GetParam().key).certificatePem);
   EXPECT_TRUE(result.valid) << result.reason;
   EXPECT_EQ(result.reason, "");
   EXPECT_THAT(result.referenceUris, ElementsAre("#_1"));
 }
 
-TEST_P(SignatureOf, DoesNotHoldForOtherContent) {
+TEST_P(SignatureAlgorithmTest, DoesNotVerifyOtherContent) {
   const VerifyResult result =
       VerifyXml(Tampered(SignedText(), "hello", "hallo"), Make(GetParam().key).certificatePem);
   EXPECT_FALSE(result.valid);
   EXPECT_NE(result.reason, "");
 }
 
-TEST_P(SignatureOf, DoesNotHoldForAnotherKey) {
+TEST_P(SignatureAlgorithmTest, DoesNotVerifyWithAnotherKey) {
   const VerifyResult result = VerifyXml(SignedText(), Make(GetParam().key, true).certificatePem);
   EXPECT_FALSE(result.valid);
   EXPECT_NE(result.reason, "");
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryAlgorithm, SignatureOf,
+    EveryAlgorithm, SignatureAlgorithmTest,
     testing::Values(
         AlgorithmCase{"RsaSha256", KeyType::Rsa2048, SignatureAlgorithm::RsaSha256,
                       DigestAlgorithm::Sha256, CanonicalMode::Exclusive},
@@ -100,13 +103,13 @@ INSTANTIATE_TEST_SUITE_P(
                       DigestAlgorithm::Sha1, CanonicalMode::Exclusive}),
     [](const auto& test) { return test.param.name; });
 
-TEST(SignXml, PutsTheSignatureBehindTheIssuer) {
+TEST(SignXmlTest, PutsTheSignatureAfterTheIssuer) {
   const std::string text = Sign(Make(KeyType::Rsa2048), {});
   EXPECT_THAT(text, HasSubstr("</a:Issuer><ds:Signature"));
   EXPECT_THAT(text, HasSubstr("<ds:X509Certificate>"));
 }
 
-TEST(SignXml, LeavesKeyInfoOutIfAsked) {
+TEST(SignXmlTest, OmitsKeyInfoIfRequested) {
   SignOptions options;
   options.keyInfo = KeyInfoContent::None;
   const std::string text = Sign(Make(KeyType::Rsa2048), options);
@@ -114,13 +117,13 @@ TEST(SignXml, LeavesKeyInfoOutIfAsked) {
   EXPECT_TRUE(VerifyXml(text, Make(KeyType::Rsa2048).certificatePem));
 }
 
-TEST(SignXml, WritesAKeyValueIfAsked) {
+TEST(SignXmlTest, WritesAKeyValueIfRequested) {
   SignOptions options;
   options.keyInfo = KeyInfoContent::KeyValue;
   EXPECT_THAT(Sign(Make(KeyType::Rsa2048), options), HasSubstr("<ds:Modulus>"));
 }
 
-TEST(SignXml, KeepsTheTemplateOfTheText) {
+TEST(SignXmlTest, KeepsTheTemplateOfTheText) {
   const std::string xml =
       R"(<r><ds:Signature xmlns:ds="http://www.w3.org/2000/09/xmldsig#"><ds:SignedInfo>)"
       R"(<ds:CanonicalizationMethod Algorithm="http://www.w3.org/2001/10/xml-exc-c14n#"/>)"
@@ -137,40 +140,40 @@ TEST(SignXml, KeepsTheTemplateOfTheText) {
   EXPECT_THAT(result.referenceUris, ElementsAre(""));
 }
 
-TEST(SignXml, WritesNonAsciiTextAsItIs) {
+TEST(SignXmlTest, WritesNonAsciiTextUnchanged) {
   EXPECT_THAT(Sign(Make(KeyType::Rsa2048), {}, "<r ID=\"_2\">\xC3\xA4</r>"),
               HasSubstr("<r ID=\"_2\">\xC3\xA4<ds:Signature"));
 }
 
-TEST(SignXml, RefusesAKeyThatDoesNotLoad) {
+TEST(SignXmlTest, RefusesAKeyThatDoesNotLoad) {
   EXPECT_THROW(SignXml(kDocument, "no key", Make(KeyType::Rsa2048).certificatePem), XmlError);
 }
 
-TEST(SignXml, RefusesAKeyOfAnotherTypeThanTheAlgorithms) {
+TEST(SignXmlTest, RefusesAKeyOfAnotherTypeThanTheAlgorithms) {
   EXPECT_THROW(Sign(Make(KeyType::EcP256), {}), XmlError);
 }
 
-TEST(VerifyXml, SaysWhyThereIsNothingToVerify) {
+TEST(VerifyXmlTest, SaysWhyThereIsNothingToVerify) {
   const std::string certificate = Make(KeyType::Rsa2048).certificatePem;
   EXPECT_EQ(VerifyXml("<a/>", certificate).reason, "no signature");
   EXPECT_THAT(VerifyXml("<a", certificate).reason, HasSubstr("line 1"));
   EXPECT_EQ(VerifyXml("<!DOCTYPE a><a/>", certificate).reason, "a document type is not accepted");
 }
 
-TEST(VerifyXml, RefusesTwoElementsOfOneId) {
+TEST(VerifyXmlTest, RefusesTwoElementsOfOneId) {
   const Credential credential = Make(KeyType::Rsa2048);
   const std::string text = Tampered(Sign(credential, {}), "</a:Root>", "<b Id=\"_1\"/></a:Root>");
   EXPECT_EQ(VerifyXml(text, credential.certificatePem).reason, "two elements have the id _1");
 }
 
-TEST(VerifyXml, FollowsNoExternalReference) {
+TEST(VerifyXmlTest, FollowsNoExternalReference) {
   const Credential credential = Make(KeyType::Rsa2048);
   const std::string text =
       Tampered(Sign(credential, {}), "URI=\"#_1\"", "URI=\"file:///etc/hosts\"");
   EXPECT_FALSE(VerifyXml(text, credential.certificatePem));
 }
 
-TEST(VerifyXml, RefusesAChangedSignatureValue) {
+TEST(VerifyXmlTest, RefusesAChangedSignatureValue) {
   const Credential credential = Make(KeyType::Rsa2048);
   for (const SignatureAlgorithm algorithm :
        {SignatureAlgorithm::RsaSha256, SignatureAlgorithm::RsaPssSha256}) {
@@ -185,11 +188,11 @@ TEST(VerifyXml, RefusesAChangedSignatureValue) {
   }
 }
 
-TEST(VerifyXml, ThrowsForACertificateThatDoesNotLoad) {
+TEST(VerifyXmlTest, ThrowsForACertificateThatDoesNotLoad) {
   EXPECT_THROW(VerifyXml(kDocument, "no certificate"), XmlError);
 }
 
-TEST(VerifyXml, WritesNothingToStandardError) {
+TEST(VerifyXmlTest, WritesNothingToStandardError) {
   testing::internal::CaptureStderr();
   const Credential credential = Make(KeyType::Rsa2048);
   VerifyXml(Tampered(Sign(credential, {}), "hello", "hallo"), credential.certificatePem);
@@ -199,7 +202,7 @@ TEST(VerifyXml, WritesNothingToStandardError) {
   EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
-TEST(VerifyXml, WorksOnManyThreadsAtOnce) {
+TEST(VerifyXmlTest, WorksOnManyThreadsAtOnce) {
   const Credential credential = Make(KeyType::Rsa2048);
   const std::string good = Sign(credential, {});
   const std::string bad = Tampered(good, "hello", "hallo");
@@ -232,15 +235,15 @@ struct CanonicalCase {
   const char* expected;
 };
 
-class CanonicalFormOf : public testing::TestWithParam<CanonicalCase> {};
+class CanonicalFormTest : public testing::TestWithParam<CanonicalCase> {};
 
-TEST_P(CanonicalFormOf, IsAsTheRecommendationSays) {
+TEST_P(CanonicalFormTest, MatchesTheRecommendation) {
   const CanonicalCase& test = GetParam();
   EXPECT_EQ(Canonicalize(kTree, test.selector, test.mode, test.prefixes), test.expected);
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryMode, CanonicalFormOf,
+    EveryMode, CanonicalFormTest,
     testing::Values(
         CanonicalCase{"InclusiveDocument",
                       "",
@@ -279,7 +282,7 @@ INSTANTIATE_TEST_SUITE_P(
                       "<p:e Id=\"i\" z=\"\">&lt;&amp;</p:e></p:r>"}),
     [](const auto& test) { return test.param.name; });
 
-TEST(Canonicalize, RefusesWhatHasNoCanonicalForm) {
+TEST(CanonicalizeTest, RefusesWhatHasNoCanonicalForm) {
   EXPECT_THROW(Canonicalize("<a xmlns='relative'/>", "", CanonicalMode::Inclusive), XmlError);
   EXPECT_THROW(Canonicalize("<a><p:b/></a>", "", CanonicalMode::Inclusive), XmlError);
   EXPECT_THROW(Canonicalize("<!DOCTYPE a><a/>", "", CanonicalMode::Inclusive), XmlError);
@@ -287,11 +290,11 @@ TEST(Canonicalize, RefusesWhatHasNoCanonicalForm) {
   EXPECT_THROW(Canonicalize("<a><b/><b/></a>", "//b", CanonicalMode::Inclusive), XmlError);
 }
 
-TEST(Canonicalize, TakesTheDefaultNamespaceInAPrefixList) {
+TEST(CanonicalizeTest, TakesTheDefaultNamespaceInAPrefixList) {
   EXPECT_EQ(Canonicalize("<a xmlns='urn:d' xmlns:p='urn:p'><p:b Id='i'/></a>", "#i",
                          CanonicalMode::Exclusive, {"#default"}),
             "<p:b xmlns=\"urn:d\" xmlns:p=\"urn:p\" Id=\"i\"></p:b>");
 }
 
 }  // namespace
-}  // namespace DevSts
+}  // namespace DevSts::Testing

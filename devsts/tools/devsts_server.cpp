@@ -1,5 +1,5 @@
-// Runs the service until SIGTERM or SIGINT, or the end of standard input if so asked. Standard
-// input carries commands then.
+// Runs the service until SIGTERM or SIGINT or, with --end-with-stdin, until the end of standard
+// input, which then contains commands.
 #include <poll.h>
 #include <sys/signalfd.h>
 #include <unistd.h>
@@ -28,14 +28,15 @@ constexpr std::string_view kUsage =
     "                     [--vendor-host HOST] [--solution-host HOST] [--end-with-stdin]\n"
     "                     [--no-resumption] [--keytab FILE | --realm] [--principal NAME=USER]\n"
     "                     [--request-mic]\n"
-    "Port 0 takes a free one. DIR receives ca.pem and signing.pem, and client.pem and\n"
-    "client-key.pem, by which machine@EXAMPLE.COM may ask for tokens.\n"
+    "Port 0 selects a free port. DIR receives ca.pem, signing.pem, client.pem and client-key.pem;\n"
+    "machine@EXAMPLE.COM may ask for tokens with the client's key and certificate.\n"
     "With --end-with-stdin, each line of standard input is a command: revoke ID.\n"
     "With --no-resumption, TLS sessions are not resumed.\n"
-    "With --keytab, users log in by Kerberos at a service whose key FILE has. --realm starts a\n"
-    "realm for that, in which alice has a ticket. --principal, which may be repeated, names the\n"
-    "user of a Kerberos principal if it is not the one of the same name. With --request-mic, a\n"
-    "login takes two legs.\n";
+    "With --keytab, users log in with Kerberos; FILE contains the service's keys. With --realm, "
+    "the\n"
+    "program starts a realm of its own, in which alice has a ticket. --principal, which may be\n"
+    "repeated, maps a Kerberos principal to a user; other principals are the users of the same\n"
+    "name. With --request-mic, a login takes two legs.\n";
 
 constexpr char kClientUser[] = "machine@EXAMPLE.COM";
 
@@ -87,7 +88,7 @@ void Take(const std::string& name, const std::string& value, Arguments& argument
   }
 }
 
-// False if there is no such flag.
+// Returns false if there is no such flag.
 bool TakeFlag(const std::string& name, Arguments& arguments) {
   if (name == "--end-with-stdin") {
     arguments.endWithStdin = true;
@@ -121,10 +122,10 @@ Arguments Parse(int argc, char** argv) {
   return arguments;
 }
 
-// One line at a time, whichever thread writes it.
+// Threads write one line at a time.
 std::mutex outputMutex;
 
-// The request's body is left out: it holds the password.
+// Leaves out the request's body, which contains the password.
 void PrintRequest(const DevSts::ReceivedRequest& request) {
   const std::lock_guard lock(outputMutex);
   const auto signature = static_cast<std::size_t>(request.signature);
@@ -149,7 +150,7 @@ sigset_t EndSignals() {
   return signals;
 }
 
-void Obey(const std::string& command, DevSts::Server& server) {
+void Execute(const std::string& command, DevSts::Server& server) {
   constexpr std::string_view kRevoke = "revoke ";
   const std::lock_guard lock(outputMutex);
   if (command.rfind(kRevoke, 0) != 0) {
@@ -160,15 +161,15 @@ void Obey(const std::string& command, DevSts::Server& server) {
   std::cout << (server.Revoke(id) ? "revoked " : "no such token: ") << id << std::endl;
 }
 
-// Takes the complete lines off the text.
-void ObeyLines(std::string& text, DevSts::Server& server) {
+// Executes the complete lines and removes them from the text.
+void ExecuteLines(std::string& text, DevSts::Server& server) {
   for (std::size_t end = text.find('\n'); end != std::string::npos; end = text.find('\n')) {
-    Obey(text.substr(0, end), server);
+    Execute(text.substr(0, end), server);
     text.erase(0, end + 1);
   }
 }
 
-// False at the end of standard input.
+// Returns false at the end of standard input.
 bool TakeInput(std::string& text, DevSts::Server& server) {
   std::array<char, 256> octets{};
   const ssize_t size = read(STDIN_FILENO, octets.data(), octets.size());
@@ -176,7 +177,7 @@ bool TakeInput(std::string& text, DevSts::Server& server) {
     return false;
   }
   text.append(octets.data(), static_cast<std::size_t>(size));
-  ObeyLines(text, server);
+  ExecuteLines(text, server);
   return true;
 }
 
@@ -204,14 +205,13 @@ void WriteFiles(const std::string& folder, DevSts::Server& server) {
   DevSts::WriteSecretFile(folder + "/client-key.pem", client.privateKeyPem);
 }
 
-// A realm in which alice has logged in and the service has its key, and what a client of the
-// service must know of it.
+// A realm in which alice has logged in and the service has a key, and alice's credential cache.
 struct StartedRealm {
   DevSts::KerberosRealm realm;
   std::string cache;
 };
 
-// Called while this is the only thread: it changes the environment.
+// Changes the environment, so it must be called while there is only one thread.
 std::unique_ptr<StartedRealm> StartRealm(DevSts::ServerOptions& options) {
   auto started = std::make_unique<StartedRealm>();
   options.negotiation.keytab = started->realm.AddKeytab("HTTP/localhost");

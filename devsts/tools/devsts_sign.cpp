@@ -1,5 +1,5 @@
-// devsts_sign KEY CERTIFICATE INPUT OUTPUT: signs by the template in the input, or as SignXml does
-// without one.
+// devsts_sign KEY CERTIFICATE INPUT OUTPUT: signs with the template in the input, or with the
+// default options of SignXml.
 #include <exception>
 #include <iostream>
 

@@ -1,5 +1,5 @@
-// devsts_verify CERTIFICATE FILE: 0 if the first signature verifies, 1 if not, 2 if it cannot be
-// told.
+// devsts_verify CERTIFICATE FILE: exits with 0 if the first signature is valid, 1 if it is not, 2
+// on errors.
 #include <exception>
 #include <iostream>
 

@@ -29,10 +29,10 @@ inline void WriteFile(const std::string& path, const std::string& text) {
   }
 }
 
-// The same for what nobody but the owner may read.
+// The same for a file that only the owner may read.
 inline void WriteSecretFile(const std::string& path, const std::string& text) {
   const int file = open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR);
-  // A file that was there keeps its mode, and could be open to others.
+  // An existing file would keep its mode, which could allow others to read it.
   const bool ours = file >= 0 && fchmod(file, S_IRUSR | S_IWUSR) == 0;
   if (file >= 0) {
     close(file);

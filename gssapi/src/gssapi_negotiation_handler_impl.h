@@ -9,16 +9,15 @@
 #include <string>
 #include <vector>
 
-#include "gss_credentials.h"
-#include "gss_handle.h"
-#include "memory_cache.h"
+#include "credentials.h"
+#include "handles.h"
 
 namespace SsoClient {
 
 class GssapiNegotiationHandlerImpl final : public GssapiNegotiationHandler {
  public:
-  /// `config` has been checked. Throws `SsoException` when the library cannot read the service's
-  /// name.
+  /// `config` must have been checked. Throws `SsoException` if the library cannot parse the
+  /// service's name.
   explicit GssapiNegotiationHandlerImpl(const GssapiNegotiationConfig& config);
 
   std::shared_ptr<const std::vector<unsigned char>> Negotiate(
@@ -26,17 +25,17 @@ class GssapiNegotiationHandlerImpl final : public GssapiNegotiationHandler {
   bool IsEstablished() const override;
 
  private:
-  enum class State { kIdle, kUnderWay, kEstablished };
+  enum class State { kIdle, kInProgress, kEstablished };
 
   void Begin();
   void CountLeg();
   void End(State state) noexcept;
-  std::string Attempt() const;  // what the message of a failure begins with
+  std::string Attempt() const;  // the beginning of a failure's message
   std::vector<unsigned char> NextLeg(const std::vector<unsigned char>& serverLeg);
 
   const std::string targetService_;
   GssName target_;
-  // Outlives the credentials, which hold it open.
+  // Declared before the credentials, which keep it open.
   std::optional<MemoryCache> ownCache_;
   CredentialSource source_;
   GssCredential credentials_;

@@ -2,21 +2,22 @@
 #define SSOCLIENT_GSSAPI_TESTS_GSS_ACCEPTOR_H
 
 #include <gssapi/gssapi.h>
+#include <ssoclient/gssapi_negotiation_handler.h>
 
 #include <string>
 #include <vector>
 
-#include "gss_handle.h"
+#include "handles.h"
 
 namespace SsoClient::Testing {
 
 /// The service's side of one negotiation.
 class GssAcceptor {
  public:
-  /// Throws `SsoException` when the keytab has no keys.
+  /// Throws `SsoException` if the keytab has no keys.
   explicit GssAcceptor(const std::string& keytab);
 
-  /// The service's leg, which is the refusal when `error` is not empty afterwards.
+  /// Returns the service's leg, which is a refusal if `error` is not empty afterwards.
   std::vector<unsigned char> Accept(const std::vector<unsigned char>& leg);
 
   bool isEstablished = false;
@@ -28,6 +29,14 @@ class GssAcceptor {
   GssCredential credentials_;
   GssContext context_;
 };
+
+/// A NegTokenResp (RFC 4178, section 4.2.2) for Kerberos with this state and without a message of
+/// Kerberos.
+std::vector<unsigned char> EmptyAnswer(unsigned char state);
+
+/// Negotiates with a service that has the keys of `keytab`, and expects it to see `client` log in.
+void ExpectLogin(GssapiNegotiationHandler& handler, const std::string& keytab,
+                 const std::string& client);
 
 }  // namespace SsoClient::Testing
 

@@ -1,11 +1,17 @@
-// The handler in the two places that legs are exchanged in, against a service that accepts
-// Kerberos.
+// The handler in the two places that exchange legs, with a service that accepts Kerberos.
 #include <ssoclient/gssapi_negotiation_handler.h>
 
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
 #include <tarnik/text/string_util.h>
 
 #include <boost/none.hpp>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
 
 #include "gss_acceptor.h"
 #include "realm_fixture.h"
@@ -19,10 +25,9 @@
 #include "support/assertion_text.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using Testing::GssAcceptor;
 using TestSupport::ThrownMessage;
 
 using Leg = std::vector<unsigned char>;
@@ -33,7 +38,7 @@ struct Behavior {
   bool isImpostor = false;
 };
 
-// Bytes of the request's only BinaryExchange.
+// The bytes of the request's only BinaryExchange.
 Leg LegOf(const SoapRequest& request) {
   const auto end = request.body.find("</wst:BinaryExchange>");
   const auto begin = request.body.rfind('>', end) + 1;
@@ -49,17 +54,17 @@ std::string Exchange(const Leg& leg) {
 }
 
 std::string LegAnswer(const Leg& leg) {
-  return Testing::Envelope(Testing::Rstr(Exchange(leg), " Context=\"c\""));
+  return Envelope(Rstr(Exchange(leg), " Context=\"c\""));
 }
 
 std::string TokenAnswer(const Leg& leg) {
-  return Testing::Envelope(Testing::Collection(Testing::Rstr(
-      Exchange(leg) + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
-          Testing::Requested(TestSupport::AssertionText().ToXml()),
-      " Context=\"c\"")));
+  return Envelope(Collection(
+      Rstr(Exchange(leg) + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
+               Requested(TestSupport::AssertionText().ToXml()),
+           " Context=\"c\"")));
 }
 
-// A service's end of one connection.
+// The service's end of one connection.
 class Service final : public TransportSession {
  public:
   Service(const std::string& keytab, const Behavior& behavior)
@@ -110,14 +115,14 @@ TokenSpec OneHour() {
   return spec;
 }
 
-class NegotiatedLoginTest : public Testing::RealmFixture {
+class NegotiatedLoginTest : public RealmFixture {
  protected:
   std::shared_ptr<const SamlToken> Acquire(const Behavior& behavior) {
     service_ = std::make_shared<Service>(serviceKeytab, behavior);
     return SecurityTokenServiceImpl(std::make_shared<RequestBuilderImpl>(boost::none),
                                     std::make_shared<OneService>(service_),
                                     std::make_shared<ResponseHandlerImpl>(),
-                                    std::make_shared<Testing::FakeTokenFactory>())
+                                    std::make_shared<FakeTokenFactory>())
         .AcquireTokenByGSS(OneHour(), *handler_);
   }
 
@@ -141,13 +146,13 @@ TEST_F(NegotiatedLoginTest, SendsAnEmptyLegToAServiceThatGoesOnAfterTheProof) {
   EXPECT_TRUE(handler_->IsEstablished());
 }
 
-TEST_F(NegotiatedLoginTest, TellsThatAServiceHasNotProvedItself) {
+TEST_F(NegotiatedLoginTest, ReportsThatAServiceHasNotProvedItself) {
   EXPECT_NE(Acquire({.isLastLegSent = false}), nullptr);
   EXPECT_EQ(service_->Client(), "alice@EXAMPLE.COM");
   EXPECT_FALSE(handler_->IsEstablished());
 }
 
-TEST_F(NegotiatedLoginTest, GivesNoTokenOfAServiceThatCannotProveItself) {
+TEST_F(NegotiatedLoginTest, ReturnsNoTokenFromAServiceThatCannotProveItself) {
   for (const bool isTokenWithLastLeg : {true, false}) {
     EXPECT_THROW(Acquire({.isTokenWithLastLeg = isTokenWithLastLeg, .isImpostor = true}),
                  SsoException);
@@ -165,16 +170,16 @@ TEST_F(NegotiatedLoginTest, SendsNothingWithoutCredentials) {
   EXPECT_TRUE(service_->legs.empty());
 }
 
-TEST_F(NegotiatedLoginTest, ServesOneLoginAfterTheOther) {
+TEST_F(NegotiatedLoginTest, ServesLoginsInSequence) {
   EXPECT_NE(Acquire({}), nullptr);
   EXPECT_THROW(Acquire({.isImpostor = true}), SsoException);
   EXPECT_NE(Acquire({}), nullptr);
   EXPECT_TRUE(handler_->IsEstablished());
 }
 
-// The line is about the empty answer to the last leg. It means no harm.
+// The line is about the empty answer to the last leg. It is harmless.
 TEST_F(NegotiatedLoginTest, IsLoggedForItsLastLeg) {
-  const Testing::LogCapture log(4);
+  const LogCapture log(4);
   Acquire({});
   EXPECT_THAT(log.Lines(),
               testing::ElementsAre(
@@ -201,4 +206,4 @@ TEST_F(NegotiatedLoginTest, IsMadeLegByLegWithAContext) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

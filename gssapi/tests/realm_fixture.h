@@ -11,7 +11,7 @@
 namespace SsoClient::Testing {
 
 /// A realm with the users "alice" and "bob", the service "HTTP/sts.example" and the machine account
-/// "machine", of which this process is a part while the tests of a suite run.
+/// "machine". This process is part of it while the tests of a suite run.
 class RealmFixture : public testing::Test {
  protected:
   static constexpr char kService[] = "HTTP@sts.example";
@@ -19,17 +19,17 @@ class RealmFixture : public testing::Test {
   static void SetUpTestSuite();
   static void TearDownTestSuite();
 
-  /// Without a default credential cache.
+  /// Sets the default credential cache to one that does not exist.
   RealmFixture();
 
-  /// A configuration with a new ticket of the user's.
+  /// A configuration with a new ticket for the user.
   static GssapiNegotiationConfig ConfigOf(const std::string& user);
   /// A configuration with the keys of "machine".
   static GssapiNegotiationConfig MachineConfig();
-  /// Stops the realm's KDC and has this process look for it at a port of 127.0.0.1, by TCP, until
-  /// the realm's clock is set.
+  /// Stops the realm's KDC and makes this process connect to a port of 127.0.0.1 instead, by TCP,
+  /// until the realm's clock is set.
   static void ReplaceKdc(int port);
-  /// No thread may run meanwhile.
+  /// Must not be called while other threads run.
   static void SetDefaultCache(const std::string& name);
 
   static std::unique_ptr<DevSts::KerberosRealm> realm;

@@ -1,23 +1,28 @@
 #include "talkative_kdc.h"
 
 #include <arpa/inet.h>
+#include <gtest/gtest.h>
+#include <krb5.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <cstdint>
 #include <stdexcept>
 #include <utility>
 
-#include "krb5_handles.h"
+#include "handles.h"
 
 namespace SsoClient::Testing {
 
 namespace {
 
+using Leg = std::vector<unsigned char>;
+
 bool Receive(int connection, void* data, std::size_t size) {
   return ::recv(connection, data, size, MSG_WAITALL) == static_cast<ssize_t>(size);
 }
 
-// Messages stand behind their length (RFC 4120, section 7.2.2).
+// Each message follows its length (RFC 4120, section 7.2.2).
 void Answer(int connection, const std::string& message) {
   std::uint32_t size = 0;
   if (!Receive(connection, &size, sizeof(size))) {
@@ -30,6 +35,18 @@ void Answer(int connection, const std::string& message) {
   size = htonl(static_cast<std::uint32_t>(message.size()));
   const std::string framed(reinterpret_cast<const char*>(&size), sizeof(size));
   ::send(connection, (framed + message).data(), framed.size() + message.size(), MSG_NOSIGNAL);
+}
+
+// One element of DER (X.690) with a content of less than 256 bytes.
+Leg Element(unsigned char tag, const Leg& content) {
+  EXPECT_LT(content.size(), 0x100U);
+  Leg whole{tag};
+  if (content.size() >= 0x80) {
+    whole.push_back(0x81);
+  }
+  whole.push_back(static_cast<unsigned char>(content.size()));
+  whole.insert(whole.end(), content.begin(), content.end());
+  return whole;
 }
 
 }  // namespace
@@ -76,6 +93,16 @@ std::string KerberosError(std::string text) {
   std::string message(encoded.data, encoded.length);
   krb5_free_data_contents(context.get(), &encoded);
   return message;
+}
+
+std::vector<unsigned char> RefusalWith(const std::string& text) {
+  Leg token{0x06, 0x09, 0x2a, 0x86, 0x48, 0x86, 0xf7, 0x12, 0x01, 0x02, 0x02, 0x03, 0x00};
+  const std::string error = KerberosError(text);
+  token.insert(token.end(), error.begin(), error.end());
+  Leg fields{0xa0, 0x03, 0x0a, 0x01, 0x01};
+  const Leg response = Element(0xa2, Element(0x04, Element(0x60, token)));
+  fields.insert(fields.end(), response.begin(), response.end());
+  return Element(0xa1, Element(0x30, fields));
 }
 
 }  // namespace SsoClient::Testing

@@ -3,13 +3,14 @@
 
 #include <string>
 #include <thread>
+#include <vector>
 
 #include "transport/loopback_server.h"
 
 namespace SsoClient::Testing {
 
-/// A KDC on loopback that answers every request with an error (RFC 4120, section 5.9.1) that has a
-/// text of its own.
+/// A KDC on loopback that answers every request with an error (RFC 4120, section 5.9.1) that
+/// contains the given text.
 class TalkativeKdc {
  public:
   explicit TalkativeKdc(std::string text);
@@ -27,8 +28,11 @@ class TalkativeKdc {
   std::thread thread_;
 };
 
-/// A KRB-ERROR with the code KRB_ERR_GENERIC.
+/// A KRB-ERROR with the code KRB_ERR_GENERIC and the given text.
 std::string KerberosError(std::string text);
+/// The leg of a service that refuses a login with such an error, in the frames of RFC 4121,
+/// section 4.1, and of RFC 4178.
+std::vector<unsigned char> RefusalWith(const std::string& text);
 
 }  // namespace SsoClient::Testing
 

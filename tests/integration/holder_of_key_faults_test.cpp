@@ -44,7 +44,7 @@ class HolderOfKeyFaultTest : public HolderOfKeyTest {
 
 TEST_F(HolderOfKeyFaultTest, UnknownCertificateIsNobodys) {
   ExpectRejected(CallNow(Operation::Certificate, *HolderService(Stranger()), {}),
-                 "The certificate is nobody's");
+                 "The certificate belongs to no user");
 }
 
 TEST_F(HolderOfKeyFaultTest, ProvenKeyDoesNotStandForThePassword) {

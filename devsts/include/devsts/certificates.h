@@ -5,8 +5,8 @@
 #include <string>
 #include <vector>
 
-/// Keys and certificates made on the spot. All texts are PEM. Functions are thread-safe and throw
-/// `std::runtime_error` when OpenSSL fails.
+/// Generates keys and certificates. All texts are PEM. Functions are thread-safe and throw
+/// `std::runtime_error` if OpenSSL fails.
 namespace DevSts {
 
 /// A certificate with its private key.
@@ -18,7 +18,7 @@ struct Credential {
 enum class KeyType {
   Rsa2048,
   Rsa3072,
-  Rsa1024,  ///< only to make what a careful reader refuses
+  Rsa1024,  ///< only for input that verifiers must refuse
   EcP256,
   EcP384,
 };
@@ -26,7 +26,7 @@ enum class KeyType {
 /// What `MakeCertificate` puts into a certificate (RFC 5280).
 struct CertificateSpec {
   std::string commonName;
-  /// subjectAltName dNSName entries, byte for byte (a NUL inside is kept).
+  /// subjectAltName dNSName entries, byte for byte (embedded NULs are kept).
   std::vector<std::string> dnsNames;
   /// subjectAltName iPAddress entries, in their text form.
   std::vector<std::string> addresses;
@@ -35,12 +35,12 @@ struct CertificateSpec {
   std::chrono::seconds notBefore{-3600};
   std::chrono::seconds notAfter{30L * 24 * 3600};
   KeyType keyType = KeyType::EcP256;
-  /// Draws a key for this certificate alone. Otherwise keys are shared by every certificate of the
-  /// same common name and key type in this process, for drawing RSA keys is slow.
+  /// Generates a key for this certificate only. Otherwise all certificates with the same common
+  /// name and key type share one key in this process, because generating RSA keys is slow.
   bool freshKey = false;
 };
 
-/// Makes a certificate signed by `issuer`, or by itself if `issuer` is null.
+/// Makes a certificate signed by `issuer`, or a self-signed one if `issuer` is null.
 Credential MakeCertificate(const CertificateSpec& spec, const Credential* issuer = nullptr);
 
 }  // namespace DevSts

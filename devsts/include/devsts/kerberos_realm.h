@@ -9,17 +9,17 @@
 
 namespace DevSts {
 
-/// A Kerberos realm of its own on loopback: database, keys and configuration in a temporary folder,
-/// and a running KDC (MIT's krb5kdc). Ends with this object, KDC and folder included. Needs no
-/// root.
+/// A private Kerberos realm on loopback: database, keys and configuration in a temporary folder,
+/// and a running KDC (MIT's krb5kdc). The destructor stops the KDC and removes the folder. Does not
+/// need root privileges.
 ///
-/// A process is a part of the realm when its environment variable KRB5_CONFIG names `ConfigPath`.
-/// Used by one thread at a time.
+/// A process is part of the realm if its environment variable KRB5_CONFIG is `ConfigPath`. An
+/// object must be used by one thread at a time.
 class KerberosRealm {
  public:
   static constexpr const char* kName = "EXAMPLE.COM";
 
-  /// Throws `std::runtime_error`, with what the tools wrote, when the realm cannot be set up.
+  /// Throws `std::runtime_error`, with the output of the tools, if the realm cannot be set up.
   KerberosRealm();
   ~KerberosRealm();
   KerberosRealm(const KerberosRealm&) = delete;
@@ -27,21 +27,21 @@ class KerberosRealm {
 
   const std::string& Folder() const;
   const std::string& ConfigPath() const;
-  /// The KDC's process; -1 while none runs.
+  /// The KDC's process ID; -1 while it is not running.
   pid_t KdcProcess() const;
 
   /// Adds a user with a password.
   void AddUser(const std::string& name, const std::string& password);
-  /// Adds a principal with a key that nobody knows and returns the path of a keytab with it.
+  /// Adds a principal with a random key and returns the path of a keytab that contains the key.
   std::string AddKeytab(const std::string& principal);
-  /// Gets a ticket of the user's and returns the name of a credential cache with it, such as the
-  /// environment variable KRB5CCNAME holds.
+  /// Acquires a ticket for the user and returns the name of a credential cache that contains it, in
+  /// the form of the environment variable KRB5CCNAME.
   std::string Login(const std::string& name, const std::string& password,
                     std::chrono::seconds lifetime = std::chrono::minutes(10));
-  /// Starts the KDC anew with a clock that goes wrong by `offset`, for the calls that follow as
-  /// well: with a clock an hour slow, `Login` gets tickets that have long expired.
+  /// Restarts the KDC with a clock that is wrong by `offset`, which also applies to the calls that
+  /// follow: with a clock that is an hour slow, `Login` acquires tickets that have long expired.
   void SetClock(std::chrono::seconds offset);
-  /// Ends the KDC: nobody answers from then on.
+  /// Stops the KDC: requests are not answered from then on.
   void StopKdc();
 
  private:

@@ -9,13 +9,14 @@
 #include <utility>
 #include <vector>
 
-/// What the server can be told to do wrong. Members combine: an answer is chosen, then sent by the
-/// rules about its shape, then by those about time and the connection.
+/// What the server can be told to do wrong. Members combine: those that choose an answer apply
+/// first, then those that change its shape, then those about timing and the connection.
 namespace DevSts {
 
 /// A SOAP 1.1 fault (SOAP 1.1, section 4.4).
 struct FaultAnswer {
-  /// Namespace and local name of faultcode; an empty namespace writes the code without a prefix.
+  /// Namespace and local name of faultcode. If the namespace is empty, the code is written without
+  /// a prefix.
   std::string codeNamespace;
   std::string codeName;
   std::string faultString;
@@ -24,8 +25,8 @@ struct FaultAnswer {
   int httpStatus = 500;
 };
 
-/// A complete HTTP answer. "Content-Length" is added unless `headers` names it or
-/// Transfer-Encoding, or chunks are asked for.
+/// A complete HTTP answer. "Content-Length" is added unless `headers` contains it or
+/// Transfer-Encoding, or chunks are requested.
 struct HttpAnswer {
   int status = 200;
   std::string reason = "OK";
@@ -33,7 +34,7 @@ struct HttpAnswer {
   std::string body;
 };
 
-/// Where the server stops until the peer closes or the server is stopped.
+/// Where the server stalls until the peer closes the connection or the server is stopped.
 enum class Stall {
   None,
   BeforeTlsHandshake,  ///< the TCP connection is accepted, nothing is read
@@ -61,50 +62,50 @@ struct Drip {
   std::chrono::milliseconds interval{100};  ///< pause between them
 };
 
-/// What is wrong with the answer to a leg of a negotiation that is not answered with a fault.
+/// What is wrong with the answer to a leg of a negotiation, unless the answer is a fault.
 struct LegMisbehavior {
-  /// Answers with this Context, empty as well. If the negotiation goes on, it does so by this
-  /// Context alone; with an empty one, it does not.
+  /// Answers with this Context, which may be empty. A negotiation that continues does so only in
+  /// this Context; with an empty one, it does not continue.
   std::optional<std::string> context = {};
-  /// Writes no Context at all.
+  /// Writes no Context attribute.
   bool omitContext = false;
-  /// Answers with these octets in BinaryExchange, none as well.
+  /// Answers with these octets in BinaryExchange, which may be empty.
   std::optional<std::string> leg = {};
   /// Writes no BinaryExchange.
   bool omitLeg = false;
-  /// Sets no cookie, and yet demands it.
+  /// Sets no cookie but still requires it in the later legs.
   bool omitCookie = false;
   /// Forgets the negotiation.
   bool forget = false;
 };
 
 struct Misbehavior {
-  /// Answers with this fault, whatever the request.
+  /// Answers every request with this fault.
   std::optional<FaultAnswer> fault;
-  /// Answers with this, whatever the request; preferred to `fault`.
+  /// Answers every request with this; takes precedence over `fault`.
   std::optional<HttpAnswer> httpAnswer;
-  /// Sends exactly these octets in place of an HTTP answer, then keeps the connection unless
-  /// `closeConnection`; preferred to both.
+  /// Sends exactly these octets instead of an HTTP answer, then keeps the connection open unless
+  /// `closeConnection`; takes precedence over both.
   std::optional<std::string> rawAnswer;
-  /// Sent in front of the answer (1xx answers, for instance).
+  /// Sent before the answer (1xx answers, for example).
   std::string rawPrefix;
-  /// Changes the SOAP envelope of whatever is answered; may run on several threads at once.
-  /// If it throws, the connection is closed without an answer.
+  /// Changes the SOAP envelope of every answer; may run on several threads at once. If it throws,
+  /// the connection is closed without an answer.
   std::function<void(std::string& envelope)> editEnvelope;
-  /// For a request that is a leg of a negotiation and is answered by the service.
+  /// Applies to requests that are legs of a negotiation and that the service itself answers.
   LegMisbehavior leg;
 
-  /// Further header fields of the answer; one Set-Cookie field for each of `setCookies`.
+  /// Additional header fields of the answer; one Set-Cookie field for each of `setCookies`.
   std::vector<std::pair<std::string, std::string>> extraHeaders;
   std::vector<std::string> setCookies;
-  /// Adds header fields of about this many octets in all ("X-Padding-N").
+  /// Adds header fields ("X-Padding-N") of about this many octets in total.
   std::size_t padHeaderBytes = 0;
-  /// Adds this many blanks after the body's text.
+  /// Appends this many spaces to the body.
   std::size_t padBodyBytes = 0;
-  /// Sends the body in chunks of these sizes (RFC 9112, section 7.1), the last size repeated as
+  /// Sends the body in chunks of these sizes (RFC 9112, section 7.1), the last size is repeated as
   /// needed.
   std::vector<std::size_t> chunkSizes;
-  /// Announces and does close the connection after the answer.
+  /// Closes the connection after the answer and announces it ("Connection: close").
   bool closeConnection = false;
   /// Closes the connection after the answer without announcing it.
   bool closeUnannounced = false;

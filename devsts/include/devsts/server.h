@@ -20,26 +20,27 @@
 /// A small WS-Trust 1.3 Security Token Service for tests and demonstrations.
 namespace DevSts {
 
-/// What is right or wrong with the TLS server certificate.
+/// The kind of TLS server certificate.
 enum class ServerCertificate {
-  Valid,                ///< localhost, 127.0.0.1 and ::1 as alternative names, issued by the CA
-  ThroughIntermediate,  ///< the same, issued by an intermediate CA that is sent along
+  Valid,                ///< for localhost, 127.0.0.1 and ::1, issued by the CA
+  ThroughIntermediate,  ///< the same, issued by an intermediate CA that is sent, too
   MissingIntermediate,  ///< issued by an intermediate CA that is not sent
   Expired,
   NotYetValid,
   SelfSigned,
   WrongHost,             ///< for elsewhere.example only
   NameOnlyInCommonName,  ///< common name localhost, no alternative names
-  AddressAsDnsName,      ///< the addresses stand in dNSName entries, localhost does not
+  AddressAsDnsName,      ///< the addresses as dNSName entries, without localhost
   NulInName,             ///< dNSName "localhost", NUL, ".elsewhere.example"
-  Custom,  ///< `TlsOptions::dnsNames` and `addresses`, issued by the CA (wildcards, for instance)
+  Custom,  ///< `TlsOptions::dnsNames` and `addresses`, issued by the CA (for wildcards, for
+           ///< example)
 };
 
 enum class TlsProtocol {
   Modern,  ///< TLS 1.2 and 1.3
   Tls12Only,
   Tls11Only,
-  AnonymousSuites,  ///< TLS 1.2 with cipher suites that authenticate nobody
+  AnonymousSuites,  ///< TLS 1.2 with cipher suites without authentication
 };
 
 struct TlsOptions {
@@ -47,46 +48,46 @@ struct TlsOptions {
   std::vector<std::string> dnsNames;
   std::vector<std::string> addresses;
   TlsProtocol protocol = TlsProtocol::Modern;
-  /// Asks for a certificate issued by the CA (see `Server::MakeClientCredential`) and refuses peers
+  /// Requests a certificate issued by the CA (see `Server::MakeClientCredential`) and refuses peers
   /// without one.
   bool requireClientCertificate = false;
-  /// Hands out TLS session tickets.
+  /// Issues TLS session tickets.
   bool sessionResumption = true;
 };
 
 struct ReceivedRequest;
 
-/// Shape of the assertions that are issued.
+/// The form of the assertions that are issued.
 struct AssertionOptions {
-  /// The exclusive form's prefix list has the prefixes that stand in xsi:type values only. A token
-  /// signed in inclusive form is found forged when it comes back inside a request.
+  /// The prefix list of the exclusive form contains the prefixes that occur only in xsi:type
+  /// values. A token signed in inclusive form does not verify when it comes back inside a request.
   SignOptions signing = DefaultSigning();
-  /// Key type of the signing certificate; ECDSA algorithms need an EC key.
+  /// The key type of the signing certificate; ECDSA algorithms need an EC key.
   KeyType signingKey = KeyType::Rsa2048;
-  /// Declares the assertion's namespaces on the SOAP envelope in place of the assertion.
+  /// Declares the assertion's namespaces on the SOAP envelope instead of on the assertion.
   bool inheritNamespaces = false;
-  /// Writes line ends and indentation between elements.
+  /// Writes line breaks and indentation between elements.
   bool indent = false;
   /// Writes a Format attribute on Issuer.
   bool issuerFormat = true;
   /// Writes xsi:type="xs:string" on AttributeValue.
   bool attributeValueTypes = true;
-  /// Count of RenewRestrictionType and ProxyRestriction when a renewable or delegable token is
-  /// asked for.
+  /// Count of RenewRestrictionType and of ProxyRestriction in tokens that are requested as
+  /// renewable or delegable.
   unsigned renewCount = 10;
   unsigned proxyCount = 10;
-  /// Postdatable and RenewExpired of RenewRestrictionType: whether a renewal may begin in the
-  /// future, and whether it may follow the token's end.
+  /// Postdatable and RenewExpired of RenewRestrictionType: whether a renewed token may begin in the
+  /// future, and whether an expired token may be renewed.
   bool postdatable = false;
   bool renewExpired = false;
-  /// Longest lifetime that is granted.
+  /// The longest lifetime that is granted.
   std::chrono::seconds maxLifetime{30L * 24 * 3600};
-  /// Conditions start this long before now.
+  /// NotBefore of the Conditions is this long before the current time.
   std::chrono::seconds notBeforeOffset{0};
   /// Changes the assertion's text before it is signed. A ds:Signature in it is used as the
-  /// template. May run on several threads at once, as the next one.
+  /// template. This hook and the next one may run on several threads at once.
   std::function<void(std::string& assertion)> beforeSigning;
-  /// Changes the assertion's text as it stands in the answer, after it was signed.
+  /// Changes the assertion's text in the answer after it has been signed.
   std::function<void(std::string& assertion)> afterSigning;
 
   static SignOptions DefaultSigning() {
@@ -103,44 +104,45 @@ struct ServerOptions {
   std::uint16_t httpPort = 0;
   std::uint16_t httpsPort = 0;
   Users users = DemoUsers();
-  /// Host of the vendor's namespaces and attribute names.
+  /// The host in the vendor's namespaces and attribute names.
   std::string vendorHost = "sts-vendor.example";
-  /// Host of the solution-user attribute's name.
+  /// The host in the solution-user attribute's name.
   std::string solutionHost = "sso.example";
-  /// Text of the assertions' Issuer.
+  /// The Issuer of the assertions.
   std::string issuer = "https://sts.example.com/STS";
-  /// How far the clocks may differ when a request's Timestamp is judged.
+  /// The difference between clocks that is tolerated in a request's Timestamp.
   std::chrono::seconds clockSkew{60};
   AssertionOptions assertion;
   TlsOptions tls;
   NegotiationOptions negotiation;
-  /// Remembers at most this many issued tokens (the oldest are forgotten first). A forgotten token
-  /// is refused.
+  /// Remembers at most this many issued tokens (the oldest are forgotten first). Forgotten tokens
+  /// are refused.
   std::size_t issuedTokenLimit = 8192;
-  /// Keeps at most this many requests in the log (the oldest go first).
+  /// Keeps at most this many requests in the log (the oldest are removed first).
   std::size_t requestLogLimit = 4096;
-  /// Called once per request after its answer is decided, on the connection's thread.
+  /// Called once per request, on the connection's thread, after the answer has been determined and
+  /// before it is sent.
   std::function<void(const ReceivedRequest&)> onRequest;
 };
 
-/// How a request is signed, by the form of what its ds:KeyInfo refers to.
+/// How a request is signed, by the form of the reference in its ds:KeyInfo.
 enum class RequestSignature {
   None,
   ByCertificate,  ///< a BinarySecurityToken (X.509 Token Profile 1.1, section 3.2)
   ByToken,        ///< an assertion's ID (SAML Token Profile 1.1, section 3.4)
-  Other,          ///< nothing that the service knows
+  Other,          ///< a form that the service does not support
 };
 
-/// A leg of a negotiation as it was received.
+/// A received leg of a negotiation.
 struct ReceivedLeg {
   std::string context;
-  /// Counts the legs of the negotiation from 1. 0: no negotiation took it.
+  /// The number of the leg in its negotiation, from 1. 0: it belongs to no negotiation.
   unsigned ordinal = 0;
   std::string octets;
 };
 
-/// A request as it was received. Bodies hold passwords: they are for tests to look at, not for
-/// logs.
+/// A received request. Bodies contain passwords: tests may inspect them, but they must not be
+/// logged.
 struct ReceivedRequest {
   std::uint64_t connectionId = 0;       ///< counts accepted connections from 1
   std::size_t ordinalOnConnection = 0;  ///< counts the connection's requests from 1
@@ -154,15 +156,15 @@ struct ReceivedRequest {
   std::string target;
   std::vector<std::pair<std::string, std::string>> headers;  ///< in order, names as sent
   std::string body;
-  /// As far as the request was read: None, too, if its envelope or Security header is broken, or
-  /// if a misbehaviour answered it. Whether the signature is right shows in the answer.
+  /// Also None if the envelope or the Security header could not be read, or if a misbehaviour
+  /// answered the request. Does not say whether the signature is valid: see the answer.
   RequestSignature signature = RequestSignature::None;
-  /// Of a leg of a negotiation, as far as the request was read.
+  /// The leg, if the request was one of a negotiation and could be read.
   std::optional<ReceivedLeg> leg;
   int answeredStatus = 0;     ///< 0 when raw octets were sent
   std::string answeredFault;  ///< faultstring of the fault that was answered, else empty
 
-  /// The first field of this name, letter case ignored, else empty.
+  /// The first field of this name, ignoring case; empty if there is none.
   std::string Header(const std::string& name) const;
   std::size_t HeaderCount(const std::string& name) const;
 };
@@ -175,24 +177,24 @@ struct Counters {
   std::uint64_t handshakesResumed = 0;
   std::uint64_t requests = 0;
   std::uint64_t malformedRequests =
-      0;  ///< what was not an HTTP request; such a connection is closed
+      0;  ///< input that was not an HTTP request; the connection is closed
   std::uint64_t tokensIssued = 0;
   std::uint64_t faults = 0;
-  std::uint64_t negotiations = 0;      ///< first legs that a negotiation took
-  std::uint64_t negotiationLegs = 0;   ///< all legs that one took
+  std::uint64_t negotiations = 0;      ///< first legs that began a negotiation
+  std::uint64_t negotiationLegs = 0;   ///< legs that a negotiation took, first ones included
   std::uint64_t negotiatedTokens = 0;  ///< negotiations that ended in a token
   std::uint64_t stalls = 0;            ///< stalls that were reached
   std::uint64_t stalled = 0;           ///< connections that are stalled now
   std::uint64_t delayed = 0;           ///< requests whose answer is being delayed now
 };
 
-/// The service. It listens from construction to destruction on one HTTP and one HTTPS port, one
-/// thread a connection, up to about 2,000 connections at once. Every member is safe to call from
-/// any thread.
+/// The service. It listens on one HTTP and one HTTPS port from construction to destruction and uses
+/// one thread for each connection, up to about 2,000 connections at once. All members are
+/// thread-safe.
 class Server {
  public:
   /// Throws `std::runtime_error` if a port cannot be opened, a certificate cannot be made or the
-  /// keytab holds no key.
+  /// keytab has no key.
   explicit Server(ServerOptions options = {});
   /// Stops accepting, ends every connection and waits for their threads.
   ~Server();
@@ -201,19 +203,20 @@ class Server {
 
   std::uint16_t HttpPort() const;
   std::uint16_t HttpsPort() const;
-  /// With the numeric address as host, brackets around ::1.
+  /// The URL with the numeric address as host, with brackets around ::1.
   std::string HttpUrl(const std::string& path = "/sts") const;
   std::string HttpsUrl(const std::string& path = "/sts") const;
-  /// The same with another host, "localhost" for instance.
+  /// The same with another host, for example "localhost".
   std::string HttpsUrlFor(const std::string& host, const std::string& path = "/sts") const;
 
   /// The CA that issued the TLS certificates.
   std::string CaCertificatePem() const;
   std::string ServerCertificatePem() const;
-  /// The certificate whose key signs assertions, and its key for tests that sign their own.
+  /// The certificate whose key signs assertions; `SigningCredential` adds the key, for tests that
+  /// sign their own.
   std::string SigningCertificatePem() const;
   Credential SigningCredential() const;
-  /// Another signing certificate with the same subject name that the service never uses.
+  /// A signing certificate with the same subject name that the service never uses.
   Credential StrangerCredential() const;
   /// A client certificate issued by the CA.
   Credential MakeClientCredential(const std::string& commonName) const;
@@ -223,23 +226,23 @@ class Server {
   /// is no such user, `std::runtime_error` if the certificate does not load.
   void RegisterCertificate(const std::string& userName, const std::string& certificatePem);
 
-  /// From now on the issued token of this ID is neither valid nor accepted. False: no such token is
-  /// known.
+  /// Revokes the issued token with this ID: from now on it is neither valid nor accepted. Returns
+  /// false if no such token is known.
   bool Revoke(const std::string& assertionId);
 
   void SetAssertionOptions(AssertionOptions options);
 
   void SetNegotiationScript(NegotiationScript script);
-  /// Negotiations that are under way.
+  /// The number of negotiations in progress.
   std::size_t OpenNegotiations() const;
 
   /// Applies to every request (and, for the stalls before a request, every connection) from now on.
   void SetMisbehavior(Misbehavior misbehavior);
-  /// Forgets what both of these calls asked for.
+  /// Forgets the misbehaviour that `SetMisbehavior` and `MisbehaveNext` have set.
   void ClearMisbehavior();
-  /// Applies once to each of the next `count` requests, before what `SetMisbehavior` set and in the
-  /// order of the calls. One with a stall before the request is used up by a connection, not by a
-  /// request.
+  /// Applies to each of the next `count` requests, in the order of the calls and before the
+  /// misbehaviour of `SetMisbehavior`. A misbehaviour with a stall before the request is used up by
+  /// a connection, not by a request.
   void MisbehaveNext(Misbehavior misbehavior, std::size_t count = 1);
 
   std::vector<ReceivedRequest> Requests() const;
@@ -247,8 +250,8 @@ class Server {
   ReceivedRequest LastRequest() const;
   void ClearRequests();
   Counters GetCounters() const;
-  /// Waits until `condition` holds of the counters, which is looked at after each change. False: it
-  /// never did in time.
+  /// Waits until the counters satisfy `condition`, which is evaluated after each change. Returns
+  /// false if that does not happen before the time-out.
   bool WaitUntil(const std::function<bool(const Counters&)>& condition,
                  std::chrono::milliseconds timeout = std::chrono::seconds(10)) const;
 

@@ -16,12 +16,12 @@ struct User {
   std::string givenName;
   std::string surname;
   bool isSolution = false;
-  /// PEM, each one certificate by which the user may ask for tokens when it proves that it holds
-  /// the key.
+  /// Certificates, as PEM. The user may ask for tokens with each of them by proving possession of
+  /// its key.
   std::vector<std::string> certificates = {};
 };
 
-/// Accounts by user principal name, "user@domain", letter case significant.
+/// Accounts by user principal name, "user@domain", case-sensitive.
 using Users = std::map<std::string, User>;
 
 /// alice@EXAMPLE.COM (password "secret", groups EXAMPLE\staff and EXAMPLE\admins, Alice Archer),

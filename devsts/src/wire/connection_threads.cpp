@@ -1,0 +1,89 @@
+#include "wire/connection_threads.h"
+
+#include <pthread.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <exception>
+#include <utility>
+
+namespace DevSts {
+namespace {
+
+// OpenSSL cannot be told to write to sockets without raising the signal.
+void BlockBrokenPipeSignal() {
+  sigset_t signals;
+  sigemptyset(&signals);
+  sigaddset(&signals, SIGPIPE);
+  pthread_sigmask(SIG_BLOCK, &signals, nullptr);
+}
+
+using Serve = std::function<void(Connection&, std::uint64_t id)>;
+
+// A test's hook that throws ends its connection, not the process.
+void ServeQuietly(Connection& connection, std::uint64_t id, const Serve& serve) {
+  try {
+    serve(connection, id);
+  } catch (const std::exception&) {
+    connection.Abort();
+  }
+}
+
+}  // namespace
+
+void ConnectionThreads::Start(int socket, SSL_CTX* tls,
+                              const std::function<void(Connection&, std::uint64_t id)>& serve,
+                              const std::function<void()>& closed) {
+  std::unique_lock lock(mutex_);
+  if (stopped_) {
+    lock.unlock();
+    close(socket);
+    closed();
+    return;
+  }
+  const std::uint64_t id = ++lastId_;
+  auto made = std::make_unique<Connection>(socket, tls);
+  Connection& connection = *made;
+  // The new thread accesses the map only after this lock is released.
+  std::thread thread([this, id, &connection, serve, closed] {
+    BlockBrokenPipeSignal();
+    ServeQuietly(connection, id, serve);
+    Leave(id);
+    closed();
+  });
+  running_.emplace(id, Entry{std::move(made), std::move(thread)});
+  JoinFinished(lock);
+}
+
+void ConnectionThreads::Leave(std::uint64_t id) {
+  const std::lock_guard lock(mutex_);
+  const auto entry = running_.find(id);
+  finished_.push_back(std::move(entry->second.thread));
+  running_.erase(entry);
+  changed_.notify_all();
+}
+
+void ConnectionThreads::JoinFinished(std::unique_lock<std::mutex>& lock) {
+  std::vector<std::thread> finished = std::exchange(finished_, {});
+  lock.unlock();
+  for (std::thread& thread : finished) {
+    thread.join();
+  }
+  lock.lock();
+}
+
+void ConnectionThreads::Stop() {
+  std::unique_lock lock(mutex_);
+  stopped_ = true;
+  for (auto& [id, entry] : running_) {
+    entry.connection->Abort();
+  }
+  while (!running_.empty() || !finished_.empty()) {
+    JoinFinished(lock);
+    if (!running_.empty()) {
+      changed_.wait(lock, [this] { return !finished_.empty(); });
+    }
+  }
+}
+
+}  // namespace DevSts
