@@ -5,8 +5,8 @@
 
 namespace Tarnik::Xml {
 
-/// A qualified name kept in a tree; its characters follow it in memory. Most names of a document
-/// repeat, so nodes and attributes share them.
+/// A qualified name stored in a tree; its characters follow it in memory. Shared by nodes and
+/// attributes, since most names of a document occur many times.
 struct InternedName {
   unsigned length;
   unsigned prefixLength : 31;

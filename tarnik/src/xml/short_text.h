@@ -6,8 +6,8 @@
 
 namespace Tarnik::Xml {
 
-/// Whether two prefixes are the same. They have a few characters, for which the call of memcmp
-/// would cost more than the comparison; and resolving prefixes compares them all the time.
+/// True when two prefixes are equal. Prefixes are short and compared very often, so a call of
+/// memcmp would cost more than this loop.
 inline bool EqualShort(std::string_view first, std::string_view second) noexcept {
   if (first.size() != second.size()) {
     return false;
