@@ -8,8 +8,8 @@
 #include <tarnik/core/exception.h>
 
 #include "support/quote.h"
+#include "xml/equal_prefixes.h"
 #include "xml/namespaces.h"
-#include "xml/short_text.h"
 #include "xml/tree_builder.h"
 #include "xml/xml_chars.h"
 
@@ -74,7 +74,8 @@ std::optional<std::string_view> ElementNode::LookupNamespace(
     }
     for (unsigned index = 0; index < element->attributeCount_; ++index) {
       const Attribute& attribute = element->attributes_[index];
-      if (attribute.name_->isDeclaration && EqualShort(attribute.name_->DeclaredPrefix(), prefix)) {
+      if (attribute.name_->isDeclaration &&
+          EqualPrefixes(attribute.name_->DeclaredPrefix(), prefix)) {
         return attribute.Value();
       }
     }

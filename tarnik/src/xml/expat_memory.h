@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_EXPAT_MEMORY_H
-#define TARNIK_SRC_XML_EXPAT_MEMORY_H
+#ifndef TARNIK_XML_EXPAT_MEMORY_H
+#define TARNIK_XML_EXPAT_MEMORY_H
 
 #include <expat.h>
 

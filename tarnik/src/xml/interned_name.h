@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_INTERNED_NAME_H
-#define TARNIK_SRC_XML_INTERNED_NAME_H
+#ifndef TARNIK_XML_INTERNED_NAME_H
+#define TARNIK_XML_INTERNED_NAME_H
 
 #include <string_view>
 

@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_NAME_CACHE_H
-#define TARNIK_SRC_XML_NAME_CACHE_H
+#ifndef TARNIK_XML_NAME_CACHE_H
+#define TARNIK_XML_NAME_CACHE_H
 
 #include <array>
 #include <cstddef>

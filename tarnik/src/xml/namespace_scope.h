@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_NAMESPACE_SCOPE_H
-#define TARNIK_SRC_XML_NAMESPACE_SCOPE_H
+#ifndef TARNIK_XML_NAMESPACE_SCOPE_H
+#define TARNIK_XML_NAMESPACE_SCOPE_H
 
 #include <cstddef>
 #include <map>

@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_OUTPUT_BUFFER_H
-#define TARNIK_SRC_XML_OUTPUT_BUFFER_H
+#ifndef TARNIK_XML_OUTPUT_BUFFER_H
+#define TARNIK_XML_OUTPUT_BUFFER_H
 
 #include <array>
 #include <cstddef>

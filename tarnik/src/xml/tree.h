@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_TREE_H
-#define TARNIK_SRC_XML_TREE_H
+#ifndef TARNIK_XML_TREE_H
+#define TARNIK_XML_TREE_H
 
 #include <atomic>
 #include <boost/smart_ptr/intrusive_ptr.hpp>

@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_TREE_BUILDER_H
-#define TARNIK_SRC_XML_TREE_BUILDER_H
+#ifndef TARNIK_XML_TREE_BUILDER_H
+#define TARNIK_XML_TREE_BUILDER_H
 
 #include <algorithm>
 #include <new>

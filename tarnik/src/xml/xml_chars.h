@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_XML_CHARS_H
-#define TARNIK_SRC_XML_XML_CHARS_H
+#ifndef TARNIK_XML_XML_CHARS_H
+#define TARNIK_XML_XML_CHARS_H
 
 #include <string_view>
 

@@ -13,8 +13,8 @@ namespace Tarnik::Service {
 
 /// A named logger, created once and not destroyed before the process ends. A line of level L is
 /// written when the logger's level is at least L. Levels range from 0 (silence) to 9 (everything);
-/// a new logger has level 4: 1 fatal, 2 error, 3 failure of one request, 4 warning, 5 notice, 6
-/// information, 7 trace of operations, 8 and 9 detail.
+/// a new logger has level 4. The levels are 1 fatal, 2 error, 3 failure of one request, 4 warning,
+/// 5 notice, 6 information, 7 trace of operations, 8 and 9 detail.
 ///
 /// Loggers of the same name share one level. Safe from any thread.
 class TARNIK_EXPORT StaticLogger {

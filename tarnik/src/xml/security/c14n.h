@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_SECURITY_C14N_H
-#define TARNIK_SRC_XML_SECURITY_C14N_H
+#ifndef TARNIK_XML_SECURITY_C14N_H
+#define TARNIK_XML_SECURITY_C14N_H
 
 #include <string>
 #include <string_view>

@@ -19,8 +19,8 @@ void ReadTransforms(const ElementNode* element, Reference& reference, ReferenceE
   } while (content.Peek() != nullptr);
 }
 
-// Without a URI the application must know the target (XML Signature 1.1, section 4.4.3.1). No
-// application of this library does.
+// Without a URI the application must know the target (XML Signature 1.1, section 4.4.3.1). This is
+// not supported.
 std::string UriOf(const ElementNode* element) {
   ExpectAttributes(element, {"Id", "URI", "Type"});
   const auto uri = element->FindAttribute("URI");

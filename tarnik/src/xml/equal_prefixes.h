@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_SHORT_TEXT_H
-#define TARNIK_SRC_XML_SHORT_TEXT_H
+#ifndef TARNIK_XML_EQUAL_PREFIXES_H
+#define TARNIK_XML_EQUAL_PREFIXES_H
 
 #include <cstddef>
 #include <string_view>
@@ -8,7 +8,7 @@ namespace Tarnik::Xml {
 
 /// True when two prefixes are equal. Prefixes are short and compared very often, so a call of
 /// memcmp would cost more than this loop.
-inline bool EqualShort(std::string_view first, std::string_view second) noexcept {
+inline bool EqualPrefixes(std::string_view first, std::string_view second) noexcept {
   if (first.size() != second.size()) {
     return false;
   }
