@@ -17,7 +17,7 @@ using BeastError = boost::beast::error_code;
 
 constexpr int kMaxInterimAnswers = 16;
 constexpr int kSwitchingProtocols = 101;
-/// The most memory that is reserved on the word of Content-Length, before the bytes have arrived.
+/// The most memory that is reserved because of Content-Length, before the bytes have arrived.
 constexpr std::size_t kMaxReservedBytes = std::size_t{1} << 20;
 
 std::string_view View(BeastText text) {

@@ -21,7 +21,7 @@ class ResponseParser {
   explicit ResponseParser(std::string peer);
   ~ResponseParser();
 
-  /// Takes the next bytes. Throws `HttpException` for an answer that breaks the protocol or a
+  /// Takes the next bytes. Throws `HttpException` for an answer that violates the protocol or a
   /// limit.
   void Feed(std::string_view bytes);
   /// Takes the orderly end of the connection. Throws `HttpException` when it cuts the answer off.

@@ -172,7 +172,7 @@ int TlsEngine::OnNewSession(SSL* ssl, SSL_SESSION* session) {
     engine->context_->Sessions().Put(engine->sessionPeer_, std::move(owned),
                                      SessionCache::Clock::now());
   } catch (...) {
-    return 1;  // no exception may pass through OpenSSL; the session is only not resumed
+    return 1;  // no exception may pass through OpenSSL; the session is just not resumed
   }
   return 1;
 }

@@ -99,11 +99,9 @@ class TARNIK_EXPORT Signature : public virtual Object {
   /// rules:
   ///  - a reference with the enveloped-signature transform must enclose the element, so the element
   ///    must be in its final position;
-  ///  - with inclusive canonicalisation of SignedInfo the element must be in its final position
-  ///  too,
-  ///    since namespaces and xml: attributes of the elements around it are part of what is signed;
-  ///  - otherwise it may be inserted into the document afterwards, anywhere that no reference
-  ///  covers.
+  ///  - with inclusive canonicalisation of SignedInfo it must be there too, since namespaces and
+  ///    xml: attributes of the elements around it are part of what is signed;
+  ///  - otherwise it may be inserted into the document afterwards, where no reference covers it.
   /// Attributes of the ds:Signature element itself, such as Id, are not signed and may be set
   /// later, except that inclusive canonicalisation signs its namespaces and xml: attributes.
   ///
