@@ -5,7 +5,8 @@
 #include <utility>
 
 #include <tarnik/core/object_impl.h>
-#include <tarnik/text/string_util.h>
+
+#include "support/cleanse.h"
 
 namespace Tarnik {
 namespace {
@@ -24,7 +25,7 @@ class StringReader final : public Reader, public ObjectImpl {
   }
 
  private:
-  ~StringReader() override { StringUtil::Cleanse(text_); }
+  ~StringReader() override { CleanseBuffer(text_); }
 
   std::string text_;
   std::size_t position_ = 0;

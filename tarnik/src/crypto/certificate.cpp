@@ -1,15 +1,158 @@
 #include <tarnik/crypto/certificate.h>
 
 #include <openssl/pem.h>
-
+#include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/crypto_exception.h>
+#include <chrono>
+#include <climits>
+#include <ctime>
+#include <utility>
 
 #include "crypto/certificate_cache.h"
-#include "crypto/certificate_impl.h"
 #include "crypto/load_file.h"
 #include "crypto/pem.h"
+#include "crypto/public_key_impl.h"
+#include "support/openssl.h"
+#include "support/openssl_error.h"
 
 namespace Tarnik::Crypto {
+namespace {
+
+// RFC 2253, section 2.4 allows unescaped UTF-8, which other programs write. Escaped bytes would
+// never match their names.
+constexpr unsigned long kNameFlags =
+    XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
+
+[[noreturn]] void ThrowBroken(const OpenSsl::ErrorScope& errors, const char* part) {
+  throw CryptoException(
+      errors.Describe(std::string("The certificate's ") + part + " cannot be decoded"));
+}
+
+OpenSsl::OwnedCertificate Decode(const std::vector<unsigned char>& der) {
+  const OpenSsl::ErrorScope errors;
+  if (der.empty()) {
+    throw CryptoException("A certificate cannot be empty.");
+  }
+  if (der.size() > LONG_MAX) {
+    throw CryptoException("The certificate is too long.");
+  }
+  const unsigned char* position = der.data();
+  OpenSsl::OwnedCertificate certificate(
+      d2i_X509(nullptr, &position, static_cast<long>(der.size())));
+  if (certificate == nullptr) {
+    throw CryptoException(errors.Describe("The certificate cannot be decoded"));
+  }
+  if (position != der.data() + der.size()) {
+    throw CryptoException("The certificate is followed by other bytes.");
+  }
+  return certificate;
+}
+
+std::string NameText(const X509_NAME* name, const char* part) {
+  const OpenSsl::ErrorScope errors;
+  const OpenSsl::OwnedBio memory(BIO_new(BIO_s_mem()));
+  if (memory == nullptr || X509_NAME_print_ex(memory.get(), name, 0, kNameFlags) < 0) {
+    ThrowBroken(errors, part);
+  }
+  char* text = nullptr;
+  const long length = BIO_get_mem_data(memory.get(), &text);
+  return length > 0 ? std::string(text, static_cast<std::size_t>(length)) : std::string();
+}
+
+std::string SerialText(const ASN1_INTEGER* serial) {
+  const OpenSsl::ErrorScope errors;
+  const OpenSsl::OwnedBigNumber number(ASN1_INTEGER_to_BN(serial, nullptr));
+  const OpenSsl::OwnedMemory<char> text(number == nullptr ? nullptr : BN_bn2dec(number.get()));
+  if (text == nullptr) {
+    ThrowBroken(errors, "serial number");
+  }
+  return text.get();
+}
+
+System::DateTime Time(const ASN1_TIME* time, const char* part) {
+  const OpenSsl::ErrorScope errors;
+  std::tm fields{};
+  // ASN1_TIME_to_tm returns the current time for null.
+  if (time == nullptr || ASN1_TIME_to_tm(time, &fields) != 1) {
+    ThrowBroken(errors, part);
+  }
+  using namespace std::chrono;
+  const auto date =
+      year_month_day(year(fields.tm_year + 1900), month(static_cast<unsigned>(fields.tm_mon + 1)),
+                     day(static_cast<unsigned>(fields.tm_mday)));
+  const auto instant =
+      sys_days(date) + hours(fields.tm_hour) + minutes(fields.tm_min) + seconds(fields.tm_sec);
+  return System::DateTimeFromUtc(duration_cast<microseconds>(instant.time_since_epoch()).count(),
+                                 false);
+}
+
+std::vector<unsigned char> KeyIdentifier(X509* certificate) {
+  const OpenSsl::ErrorScope errors;
+  const ASN1_OCTET_STRING* identifier = X509_get0_subject_key_id(certificate);
+  if (identifier == nullptr) {
+    return {};
+  }
+  const unsigned char* bytes = ASN1_STRING_get0_data(identifier);
+  return {bytes, bytes + ASN1_STRING_length(identifier)};
+}
+
+Ref<const PublicKey> KeyOf(X509* certificate) {
+  const OpenSsl::ErrorScope errors;
+  OpenSsl::OwnedKey key(X509_get_pubkey(certificate));
+  return key == nullptr ? nullptr : Ref<const PublicKey>(new PublicKeyImpl(std::move(key)));
+}
+
+class CertificateImpl final : public Certificate, public ObjectImpl {
+ public:
+  /// `decoded` is the certificate of `der`.
+  CertificateImpl(std::vector<unsigned char> der, X509* decoded);
+
+  const unsigned char* DerBytes() const noexcept override { return der_.data(); }
+  std::size_t DerLength() const noexcept override { return der_.size(); }
+  const std::string& SubjectName() const override { return subjectName_; }
+  const std::string& IssuerName() const override { return issuerName_; }
+  const std::string& SerialNumber() const override { return serialNumber_; }
+  System::DateTime NotBefore() const override { return notBefore_; }
+  System::DateTime NotAfter() const override { return notAfter_; }
+  const std::vector<unsigned char>& SubjectKeyIdentifier() const override {
+    return subjectKeyIdentifier_;
+  }
+  Ref<const PublicKey> GetPublicKey() const override;
+  std::string ToString() const override;
+
+ private:
+  std::vector<unsigned char> der_;
+  std::string subjectName_;
+  std::string issuerName_;
+  std::string serialNumber_;
+  System::DateTime notBefore_;
+  System::DateTime notAfter_;
+  std::vector<unsigned char> subjectKeyIdentifier_;
+  Ref<const PublicKey> publicKey_;  // null when OpenSSL does not know the kind of key
+};
+
+CertificateImpl::CertificateImpl(std::vector<unsigned char> der, X509* decoded)
+    : der_(std::move(der)),
+      subjectName_(NameText(X509_get_subject_name(decoded), "subject name")),
+      issuerName_(NameText(X509_get_issuer_name(decoded), "issuer name")),
+      serialNumber_(SerialText(X509_get0_serialNumber(decoded))),
+      notBefore_(Time(X509_get0_notBefore(decoded), "start of validity")),
+      notAfter_(Time(X509_get0_notAfter(decoded), "end of validity")),
+      subjectKeyIdentifier_(KeyIdentifier(decoded)),
+      publicKey_(KeyOf(decoded)) {}
+
+Ref<const PublicKey> CertificateImpl::GetPublicKey() const {
+  if (publicKey_ == nullptr) {
+    throw CryptoException("The certificate's public key is broken or of an unknown kind.");
+  }
+  return publicKey_;
+}
+
+std::string CertificateImpl::ToString() const {
+  return "Certificate of " + subjectName_;
+}
+
+}  // namespace
 
 Ref<const Certificate> CreateCertificateFromDer(const unsigned char* bytes, std::size_t length) {
   if (bytes == nullptr) {
@@ -19,8 +162,9 @@ Ref<const Certificate> CreateCertificateFromDer(const unsigned char* bytes, std:
   if (auto known = cache.Find({reinterpret_cast<const char*>(bytes), length})) {
     return known;
   }
-  Ref<const Certificate> certificate(
-      new CertificateImpl(std::vector<unsigned char>(bytes, bytes + length)));
+  std::vector<unsigned char> der(bytes, bytes + length);
+  const OpenSsl::OwnedCertificate decoded = Decode(der);
+  const auto certificate = MakeRef<const CertificateImpl>(std::move(der), decoded.get());
   cache.Add(certificate);
   return certificate;
 }

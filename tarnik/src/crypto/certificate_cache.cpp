@@ -13,24 +13,24 @@ std::string_view BytesOf(const Certificate& certificate) noexcept {
 
 Ref<const Certificate> CertificateCache::Find(std::string_view der) {
   const std::lock_guard lock(mutex_);
-  const auto place = places_.find(der);
-  if (place == places_.end()) {
+  const auto position = positions_.find(der);
+  if (position == positions_.end()) {
     return nullptr;
   }
-  order_.splice(order_.begin(), order_, place->second);
-  return *place->second;
+  order_.splice(order_.begin(), order_, position->second);
+  return *position->second;
 }
 
 void CertificateCache::Add(const Ref<const Certificate>& certificate) {
   const std::lock_guard lock(mutex_);
-  // Two threads may have decoded the same bytes at once.
-  if (places_.count(BytesOf(*certificate)) != 0) {
+  // Two threads may have decoded the same bytes at the same time.
+  if (positions_.count(BytesOf(*certificate)) != 0) {
     return;
   }
   order_.push_front(certificate);
-  places_.emplace(BytesOf(*certificate), order_.begin());
+  positions_.emplace(BytesOf(*certificate), order_.begin());
   if (order_.size() > capacity_) {
-    places_.erase(BytesOf(*order_.back()));
+    positions_.erase(BytesOf(*order_.back()));
     order_.pop_back();
   }
 }
@@ -41,7 +41,7 @@ std::size_t CertificateCache::Size() const {
 }
 
 CertificateCache& ProcessCertificateCache() {
-  // Never destroyed: threads may use it while the process ends.
+  // Never destroyed, since threads may use it while the process ends.
   static auto* const cache = new CertificateCache(kProcessCapacity);
   return *cache;
 }

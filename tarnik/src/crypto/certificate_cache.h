@@ -11,7 +11,7 @@
 
 namespace Tarnik::Crypto {
 
-/// Keeps the certificates that were used last, to be found again by their DER bytes. Safe from many
+/// Keeps the most recently used certificates, which are found by their DER bytes. Safe from many
 /// threads.
 class CertificateCache {
  public:
@@ -19,7 +19,7 @@ class CertificateCache {
 
   /// The certificate with these bytes, or null.
   Ref<const Certificate> Find(std::string_view der);
-  /// Adds a certificate; the one that was not used for the longest time makes room for it.
+  /// Adds a certificate; if the cache is full, the least recently used one is removed.
   void Add(const Ref<const Certificate>& certificate);
   std::size_t Size() const;
 
@@ -28,9 +28,9 @@ class CertificateCache {
 
   const std::size_t capacity_;
   mutable std::mutex mutex_;
-  Order order_;  // the one used last in front
+  Order order_;  // the most recently used one first
   // The keys are the bytes inside the certificates.
-  std::unordered_map<std::string_view, Order::iterator> places_;
+  std::unordered_map<std::string_view, Order::iterator> positions_;
 };
 
 /// The cache of the process.

@@ -44,7 +44,7 @@ std::vector<unsigned char> DerFromRawEcdsa(const std::vector<unsigned char>& val
   if (signature == nullptr || ECDSA_SIG_set0(signature.get(), r.get(), s.get()) != 1) {
     throw CryptoException("The ECDSA signature cannot be encoded.");
   }
-  // The signature owns both numbers from here on.
+  // The signature owns both numbers now.
   static_cast<void>(r.release());
   static_cast<void>(s.release());
   return Encode(signature.get());

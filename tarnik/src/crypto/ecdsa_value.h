@@ -6,14 +6,14 @@
 
 namespace Tarnik::Crypto {
 
-/// The form of RFC 3279 section 2.2.3 of an ECDSA signature that is written as XML-Signature 1.1,
-/// section 6.4.3 demands: r and s as big-endian numbers of `orderLength` bytes each. Empty when
-/// `value` is not of that length, or when r or s is zero.
+/// Converts an ECDSA signature from the form of XML Signature 1.1, section 6.4.3 (r and s as
+/// big-endian numbers of `orderLength` bytes each) to the form of RFC 3279, section 2.2.3. Empty
+/// when `value` has another length, or when r or s is zero.
 std::vector<unsigned char> DerFromRawEcdsa(const std::vector<unsigned char>& value,
                                            std::size_t orderLength);
 
-/// The other way. Throws `CryptoException` when `der` is no ECDSA signature, or when a number of it
-/// does not fit.
+/// Converts in the other direction. Throws `CryptoException` when `der` is not an ECDSA signature,
+/// or when r or s does not fit into `orderLength` bytes.
 std::vector<unsigned char> RawEcdsaFromDer(const std::vector<unsigned char>& der,
                                            std::size_t orderLength);
 

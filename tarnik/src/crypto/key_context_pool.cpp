@@ -12,11 +12,11 @@
 namespace Tarnik::Crypto {
 namespace {
 
-// More threads than this may use one key at once; they then set up contexts of their own.
+// If more threads than this use one key at once, the others set up a new context each time.
 constexpr std::size_t kMaxIdleContexts = 64;
 
-// A key may live in a device whose provider also hands out the public half. Any other provider
-// would take that half and then find that it cannot sign.
+// A key may be in a device whose provider also exports the public half. Any other provider would
+// import that half and then be unable to sign.
 std::string ProviderOf(const EVP_PKEY* key) {
   const OSSL_PROVIDER* provider = EVP_PKEY_get0_provider(key);
   return provider == nullptr ? ""

@@ -4,26 +4,26 @@
 #include <mutex>
 #include <vector>
 
-#include "crypto/algorithms.h"
+#include "crypto/hash.h"
+#include "crypto/signature_scheme.h"
 #include "support/openssl.h"
 
 namespace Tarnik::Crypto {
 
 enum class KeyOperation : unsigned char { kVerify, kSign };
 
-/// OpenSSL's contexts that were set up for one operation with one key and stand idle. Setting one
-/// up makes OpenSSL look up algorithms by name, so they are kept and used again. Safe from many
-/// threads.
+/// Idle OpenSSL contexts that were set up for one operation with one key. They are reused, since
+/// setting one up makes OpenSSL look up algorithms by name. Safe from many threads.
 class KeyContextPool {
  public:
   explicit KeyContextPool(KeyOperation operation) noexcept : operation_(operation) {}
   KeyContextPool(const KeyContextPool&) = delete;
   KeyContextPool& operator=(const KeyContextPool&) = delete;
 
-  /// A context for `key`, which is always the same one. Throws `CryptoException` when the key
-  /// cannot do the operation with `scheme`.
+  /// A context for `key`, which must be the same key in every call. Throws `CryptoException` when
+  /// the key cannot do the operation with `scheme`.
   OpenSsl::OwnedKeyContext Take(EVP_PKEY* key, SignatureScheme scheme, Hash hash);
-  /// Gives back a context whose last use has succeeded.
+  /// Keeps a context whose last use succeeded.
   void Keep(SignatureScheme scheme, Hash hash, OpenSsl::OwnedKeyContext context);
 
  private:

@@ -16,8 +16,7 @@ constexpr int kMaxFailures = 1000;
 
 using OwnedUiMethod = OpenSsl::Owned<UI_METHOD, UI_destroy_method>;
 
-// Whatever stands behind the scheme may hold a PIN (RFC 7512, section 2.4): messages name the
-// scheme alone.
+// The rest of the URI may contain a PIN (RFC 7512, section 2.4), so messages name only the scheme.
 std::string SchemeOf(const std::string& uri) {
   const std::size_t colon = uri.find(':');
   if (colon == 0 || colon == std::string::npos || uri.find('\0') != std::string::npos) {
@@ -26,16 +25,16 @@ std::string SchemeOf(const std::string& uri) {
   return uri.substr(0, colon + 1);
 }
 
-[[noreturn]] void ThrowKeyless(const std::string& scheme, const Passphrase& passphrase,
-                               const OpenSsl::ErrorScope& errors) {
+[[noreturn]] void ThrowNoKey(const std::string& scheme, const Passphrase& passphrase,
+                             const OpenSsl::ErrorScope& errors) {
   passphrase.RethrowFailure();
   const std::string what = "The URI " + Quote(scheme) + " gives no private key";
   throw CryptoException(
       errors.Describe(passphrase.WasNeeded() ? what + ", or the passphrase is wrong" : what));
 }
 
-// OpenSSL's adapter of PEM callbacks would leave the text on the stack.
-int Answer(UI* dialog, UI_STRING* question) noexcept {
+// Used instead of OpenSSL's adapter for PEM callbacks, which leaves the text on the stack.
+int AnswerPrompt(UI* dialog, UI_STRING* question) noexcept {
   const UI_string_types type = UI_get_string_type(question);
   if (type != UIT_PROMPT && type != UIT_VERIFY) {
     return 1;
@@ -49,17 +48,17 @@ int Answer(UI* dialog, UI_STRING* question) noexcept {
   }
 }
 
-// A method of the caller's passphrase alone: OpenSSL's own would ask on the terminal.
-OwnedUiMethod AskTheCaller(const OpenSsl::ErrorScope& errors) {
+// Answers prompts only with the caller's passphrase: OpenSSL's default method asks on the terminal.
+OwnedUiMethod CreateUiMethod(const OpenSsl::ErrorScope& errors) {
   OwnedUiMethod method(UI_create_method("caller"));
-  if (method == nullptr || UI_method_set_reader(method.get(), Answer) != 0) {
+  if (method == nullptr || UI_method_set_reader(method.get(), AnswerPrompt) != 0) {
     throw CryptoException(errors.Describe("The passphrase cannot be asked for"));
   }
   return method;
 }
 
-// A store reports errors for what it passes over, also behind the key: only its end counts. A store
-// that does nothing but fail would never come to one.
+// A store reports an error for each object that it skips, also after the key, so it is read to its
+// end. The number of failures is limited, since a store that only fails never reports an end.
 OpenSsl::OwnedKey OnlyKeyOf(OSSL_STORE_CTX* store, const std::string& scheme) {
   OpenSsl::OwnedKey found;
   for (int failures = 0; failures < kMaxFailures && OSSL_STORE_eof(store) != 1;) {
@@ -86,7 +85,7 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
   const std::string scheme = SchemeOf(uri);
   const OpenSsl::ErrorScope errors;
   Passphrase asked(passphrase);
-  const OwnedUiMethod method = AskTheCaller(errors);
+  const OwnedUiMethod method = CreateUiMethod(errors);
   const OpenSsl::OwnedStore store(OSSL_STORE_open_ex(uri.c_str(), nullptr, nullptr, method.get(),
                                                      &asked, nullptr, nullptr, nullptr));
   OpenSsl::OwnedKey key;
@@ -94,7 +93,7 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
     key = OnlyKeyOf(store.get(), scheme);
   }
   if (key == nullptr) {
-    ThrowKeyless(scheme, asked, errors);
+    ThrowNoKey(scheme, asked, errors);
   }
   return MakeRef<const PrivateKeyImpl>(std::move(key));
 }

@@ -7,18 +7,18 @@
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/crypto/private_key.h>
 
-#include "support/file.h"
 #include "support/sensitive_text.h"
+#include "system/file.h"
 
 namespace Tarnik::Crypto {
 
-/// What `read(content, passphrase)` makes of a file. A `CryptoException` of its own names the file
-/// as one that cannot be used; what `passphrase` throws passes through.
+/// Returns `read(content, passphrase)` for the content of a file. A `CryptoException` of `read` is
+/// rethrown with the name of the file; what `passphrase` throws passes through unchanged.
 template <typename Read>
 auto LoadFile(std::string_view kind, const std::string& path, const PassphraseCallback& passphrase,
               const Read& read) {
   SensitiveText text;
-  ReadFile(kind, path, text);
+  System::ReadFile(kind, path, text);
   bool hasPassphraseFailed = false;
   PassphraseCallback observed;
   if (passphrase) {

@@ -8,13 +8,13 @@
 namespace Tarnik::Crypto {
 namespace {
 
-// PEM_BUFSIZE of OpenSSL: what its callbacks have room for.
+// PEM_BUFSIZE of OpenSSL, the size of its callbacks' buffer.
 constexpr std::size_t kMaxPassphraseBytes = 1024;
 
-/// What the callback gives, cleansed also when it is refused.
-struct Given {
+/// The text that the callback returned, cleansed also when it is refused.
+struct CallbackResult {
   std::string text;
-  ~Given() { StringUtil::Cleanse(text); }
+  ~CallbackResult() { StringUtil::Cleanse(text); }
 };
 
 }  // namespace
@@ -32,7 +32,7 @@ const std::string& Passphrase::Get() {
     try {
       Ask();
     } catch (...) {
-      // It is not asked a second time.
+      // The callback runs at most once.
       failure_ = std::current_exception();
       throw;
     }
@@ -44,13 +44,13 @@ void Passphrase::Ask() {
   if (!callback_) {
     throw CryptoException("The private key needs a passphrase, and none was given.");
   }
-  const Given given{callback_()};
-  if (given.text.size() > kMaxPassphraseBytes) {
+  const CallbackResult result{callback_()};
+  if (result.text.size() > kMaxPassphraseBytes) {
     throw CryptoException("The passphrase is longer than " + std::to_string(kMaxPassphraseBytes) +
                           " bytes.");
   }
-  // Short texts lie in the string itself, where a move would leave them.
-  text_ = given.text;
+  // Copied, since moving a short text would leave its bytes in the moved-from string.
+  text_ = result.text;
   isKnown_ = true;
 }
 

@@ -7,7 +7,7 @@
 
 namespace Tarnik::Crypto {
 
-/// The passphrase of one load: asked for when it is first needed, cleansed with this object.
+/// The passphrase of one load: requested on first use, cleansed by the destructor.
 class Passphrase {
  public:
   explicit Passphrase(const PassphraseCallback& callback) noexcept : callback_(callback) {}
@@ -20,10 +20,10 @@ class Passphrase {
   const std::string& Get();
   bool WasNeeded() const noexcept { return wasNeeded_; }
 
-  /// OpenSSL's `pem_password_cb`, with this object as its last argument. Since no exception may
-  /// cross OpenSSL, it is kept for `RethrowFailure`.
+  /// A `pem_password_cb` of OpenSSL with this object as its last argument. Since exceptions must
+  /// not pass through OpenSSL, they are kept for `RethrowFailure`.
   static int Read(char* buffer, int size, int forWriting, void* passphrase) noexcept;
-  /// Throws what `Read` has caught, if anything.
+  /// Throws the exception that `Read` caught, if any.
   void RethrowFailure() const;
 
  private:

@@ -11,7 +11,7 @@
 namespace Tarnik::Crypto {
 namespace {
 
-// With this flag OpenSSL overwrites its own buffers, too.
+// PEM_FLAG_SECURE makes OpenSSL overwrite its own buffers too.
 constexpr unsigned kFlags = PEM_FLAG_SECURE | PEM_FLAG_EAY_COMPATIBLE;
 
 bool IsEndOfBlocks() {

@@ -9,7 +9,7 @@
 
 namespace Tarnik::Crypto {
 
-/// One block of a PEM text (RFC 7468), or none. What it holds may be a private key and is cleansed.
+/// One block of a PEM text (RFC 7468), or empty. It may contain a private key and is cleansed.
 class PemBlock {
  public:
   PemBlock() = default;
@@ -19,10 +19,10 @@ class PemBlock {
   ~PemBlock();
 
   std::string_view Label() const noexcept { return label_; }
-  /// The header lines of RFC 1421 that traditional formats have; empty for none.
+  /// The header lines of RFC 1421, which traditional formats have; may be empty.
   char* Header() const noexcept { return header_; }
   unsigned char* Bytes() const noexcept { return bytes_; }
-  /// Decryption in place shortens it.
+  /// Mutable, since decryption in place shortens the bytes.
   long& Length() noexcept { return length_; }
   std::size_t Size() const noexcept { return static_cast<std::size_t>(length_); }
 

@@ -22,7 +22,7 @@ struct FreeBags {
 using OwnedSafes = std::unique_ptr<STACK_OF(PKCS7), FreeAuthenticatedSafes>;
 using OwnedBags = std::unique_ptr<STACK_OF(PKCS12_SAFEBAG), FreeBags>;
 
-// OpenSSL tells the absent passphrase from the empty one, and files are made with either.
+// OpenSSL distinguishes an absent passphrase from an empty one, and there are files with either.
 constexpr const char* kAbsent = nullptr;
 constexpr const char* kEmpty = "";
 
@@ -38,28 +38,27 @@ OpenSsl::OwnedPkcs12 Decode(const unsigned char* bytes, std::size_t length) {
   return pkcs12;
 }
 
-bool Fits(PKCS12* pkcs12, const char* text, int length) {
+bool HasMacOf(PKCS12* pkcs12, const char* text, int length) {
   const OpenSsl::ErrorScope errors;
   return PKCS12_verify_mac(pkcs12, text, length) == 1;
 }
 
-/// The text that the PKCS#12 is protected with; valid as long as `passphrase`.
+/// The passphrase that the PKCS#12 is protected with; valid as long as `passphrase`.
 const char* FindPassphrase(PKCS12* pkcs12, Passphrase& passphrase) {
   if (PKCS12_mac_present(pkcs12) != 1) {
     throw CryptoException("The PKCS#12 is not protected against changes by a passphrase.");
   }
-  if (Fits(pkcs12, kAbsent, 0)) {
+  if (HasMacOf(pkcs12, kAbsent, 0)) {
     return kAbsent;
   }
-  if (Fits(pkcs12, kEmpty, 0)) {
+  if (HasMacOf(pkcs12, kEmpty, 0)) {
     return kEmpty;
   }
   const std::string& text = passphrase.Get();
   if (text.find('\0') != std::string::npos) {
     throw CryptoException("The passphrase of a PKCS#12 cannot hold a NUL.");
   }
-  const OpenSsl::ErrorScope errors;
-  if (PKCS12_verify_mac(pkcs12, text.c_str(), static_cast<int>(text.size())) != 1) {
+  if (!HasMacOf(pkcs12, text.c_str(), static_cast<int>(text.size()))) {
     throw CryptoException("The passphrase of the PKCS#12 is wrong, or the PKCS#12 is broken.");
   }
   return text.c_str();
@@ -73,7 +72,7 @@ int CountKeys(const STACK_OF(PKCS12_SAFEBAG) * bags) {
     if (kind == NID_keyBag || kind == NID_pkcs8ShroudedKeyBag) {
       ++count;
     } else if (kind == NID_safeContentsBag) {
-      // Bags within bags (RFC 7292, section 4.2.6): OpenSSL decodes only so many levels.
+      // Bags within bags (RFC 7292, section 4.2.6). OpenSSL limits their depth.
       count += CountKeys(PKCS12_SAFEBAG_get0_safes(bag));
     }
   }
@@ -90,7 +89,7 @@ OwnedBags Unpack(PKCS7* safe, const char* text) {
   return nullptr;
 }
 
-// OpenSSL's own reader takes the first key and says nothing of the others.
+// PKCS12_parse returns the first key and ignores the others.
 void RequireOneKey(const PKCS12* pkcs12, const char* text) {
   const OpenSsl::ErrorScope errors;
   const OwnedSafes safes(PKCS12_unpack_authsafes(pkcs12));
@@ -134,7 +133,7 @@ Content Parse(PKCS12* pkcs12, const char* text) {
   return content;
 }
 
-void RequireBoth(const Content& content) {
+void RequireKeyAndCertificate(const Content& content) {
   if (content.key == nullptr) {
     throw CryptoException("The PKCS#12 holds no private key.");
   }
@@ -156,7 +155,7 @@ KeyAndCertificate CreateKeyAndCertificateFromPkcs12(const unsigned char* bytes, 
   const char* text = FindPassphrase(pkcs12.get(), asked);
   RequireOneKey(pkcs12.get(), text);
   Content content = Parse(pkcs12.get(), text);
-  RequireBoth(content);
+  RequireKeyAndCertificate(content);
   KeyAndCertificate result;
   result.privateKey = MakeRef<const PrivateKeyImpl>(std::move(content.key));
   result.certificate = ToCertificate(content.certificate.get());

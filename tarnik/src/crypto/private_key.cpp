@@ -21,6 +21,20 @@ constexpr const char* kUndecryptable =
     "The private key cannot be decrypted: the passphrase is wrong, or the key is broken";
 constexpr const char* kUndecodable = "The private key cannot be decoded";
 
+// A separate key, so that verifying with it never accesses the private half or its device.
+OpenSsl::OwnedKey PublicHalfOf(const EVP_PKEY* key) {
+  const OpenSsl::ErrorScope errors;
+  unsigned char* bytes = nullptr;
+  const int length = i2d_PUBKEY(key, &bytes);
+  const OpenSsl::OwnedMemory<unsigned char> owner(bytes);
+  const unsigned char* position = bytes;
+  OpenSsl::OwnedKey half(length <= 0 ? nullptr : d2i_PUBKEY(nullptr, &position, length));
+  if (half == nullptr) {
+    throw CryptoException(errors.Describe("The private key's public half cannot be read"));
+  }
+  return half;
+}
+
 bool IsPrivateKeyLabel(std::string_view label) noexcept {
   return label.size() >= kPrivateKeyLabel.size() &&
          label.substr(label.size() - kPrivateKeyLabel.size()) == kPrivateKeyLabel;
@@ -137,6 +151,38 @@ OpenSsl::OwnedKey Decode(PemBlock& block, Passphrase& passphrase) {
 }
 
 }  // namespace
+
+PrivateKeyImpl::PrivateKeyImpl(OpenSsl::OwnedKey key)
+    : key_(std::move(key)), publicKey_(new PublicKeyImpl(PublicHalfOf(key_.get()))) {}
+
+PrivateKeyImpl::~PrivateKeyImpl() = default;
+
+bool PrivateKeyImpl::Matches(const Certificate& certificate) const {
+  // Decoded again, since the caller may have implemented `Certificate`.
+  const Ref<const PublicKey> issued =
+      CreateCertificateFromDer(certificate.DerBytes(), certificate.DerLength())->GetPublicKey();
+  const OpenSsl::ErrorScope errors;
+  return EVP_PKEY_eq(publicKey_->Handle(), static_cast<const PublicKeyImpl&>(*issued).Handle()) ==
+         1;
+}
+
+std::string PrivateKeyImpl::ToString() const {
+  return "<PrivateKey>";
+}
+
+std::vector<unsigned char> PrivateKeyImpl::Sign(SignatureScheme scheme, Hash hash,
+                                                const unsigned char* digest) const {
+  const OpenSsl::ErrorScope errors;
+  OpenSsl::OwnedKeyContext context = contexts_.Take(key_.get(), scheme, hash);
+  std::vector<unsigned char> value(publicKey_->ValueLength());
+  std::size_t length = value.size();
+  if (EVP_PKEY_sign(context.get(), value.data(), &length, digest, HashLength(hash)) != 1) {
+    throw CryptoException(errors.Describe("The signature cannot be made"));
+  }
+  value.resize(length);
+  contexts_.Keep(scheme, hash, std::move(context));
+  return value;
+}
 
 Ref<const PrivateKey> CreatePrivateKeyFromPem(std::string_view pem,
                                               const PassphraseCallback& passphrase) {

@@ -12,7 +12,7 @@
 
 namespace Tarnik::Crypto {
 
-/// The one implementation of `PrivateKey`.
+/// The only implementation of `PrivateKey`.
 class PrivateKeyImpl final : public PrivateKey, public ObjectImpl {
  public:
   /// Throws `CryptoException` when the key has no public half.
@@ -26,7 +26,7 @@ class PrivateKeyImpl final : public PrivateKey, public ObjectImpl {
   const PublicKeyImpl& Public() const noexcept { return *publicKey_; }
   EVP_PKEY* Handle() const noexcept { return key_.get(); }
 
-  /// Signs `digest`, which was made with `hash`. An ECDSA signature is in the form of RFC 3279,
+  /// Signs `digest`, which was computed with `hash`. An ECDSA signature is in the form of RFC 3279,
   /// section 2.2.3. Throws `CryptoException` when the key cannot be used with `scheme` or the
   /// operation fails.
   std::vector<unsigned char> Sign(SignatureScheme scheme, Hash hash,

@@ -56,7 +56,7 @@ bool PublicKeyImpl::Verify(SignatureScheme scheme, Hash hash, const unsigned cha
                            const unsigned char* signature, std::size_t signatureLength) const {
   const OpenSsl::ErrorScope errors;
   OpenSsl::OwnedKeyContext context = contexts_.Take(key_.get(), scheme, hash);
-  // Zero and every negative result mean that the signature was not found to be good.
+  // Zero means a wrong signature. An error, which is negative, is treated in the same way.
   if (EVP_PKEY_verify(context.get(), signature, signatureLength, digest, HashLength(hash)) != 1) {
     return false;
   }

@@ -5,16 +5,17 @@
 #include <tarnik/crypto/public_key.h>
 #include <cstddef>
 
-#include "crypto/algorithms.h"
+#include "crypto/hash.h"
 #include "crypto/key_context_pool.h"
+#include "crypto/signature_scheme.h"
 #include "support/openssl.h"
 
 namespace Tarnik::Crypto {
 
-/// The elliptic curves that signatures are verified on.
+/// The elliptic curves that signatures may use.
 enum class Curve : unsigned char { kNone, kP256, kP384, kP521 };
 
-/// The one implementation of `PublicKey`.
+/// The only implementation of `PublicKey`.
 class PublicKeyImpl final : public PublicKey, public ObjectImpl {
  public:
   explicit PublicKeyImpl(OpenSsl::OwnedKey key);
@@ -27,13 +28,13 @@ class PublicKeyImpl final : public PublicKey, public ObjectImpl {
   Curve NamedCurve() const noexcept { return curve_; }
   /// Length in bytes of the group's order for EC keys: of each of r and s.
   std::size_t OrderLength() const noexcept { return (static_cast<std::size_t>(bits_) + 7) / 8; }
-  /// Length in bytes of the longest signature value: for RSA the only length.
+  /// Length in bytes of the longest signature value. All RSA signatures have this length.
   std::size_t ValueLength() const noexcept { return valueLength_; }
   EVP_PKEY* Handle() const noexcept { return key_.get(); }
 
-  /// True when `signature` is one of `digest`, which was made with `hash`. The ECDSA signature is
-  /// in the form of RFC 3279 section 2.2.3. Throws `CryptoException` when the key cannot be used
-  /// with `scheme`.
+  /// True when `signature` is a signature of `digest`, which was computed with `hash`. An ECDSA
+  /// signature is in the form of RFC 3279, section 2.2.3. Throws `CryptoException` when the key
+  /// cannot be used with `scheme`.
   bool Verify(SignatureScheme scheme, Hash hash, const unsigned char* digest,
               const unsigned char* signature, std::size_t signatureLength) const;
 

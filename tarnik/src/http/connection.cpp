@@ -6,6 +6,8 @@
 #include <tarnik/system/thread_pool.h>
 #include <tarnik/text/string_util.h>
 
+#include "core/copy_exception.h"
+
 namespace Tarnik::Http {
 namespace {
 
@@ -37,13 +39,11 @@ void Connection::Read(ReadHandler handler) {
   StartRead();
 }
 
-// The result waits for a thread of its own, as a stream's would: a handler is never run inside the
-// call that it was handed to.
+// Posted, since a handler never runs inside the call that it was passed to.
 void Connection::DeliverEarly(ReadHandler handler) {
   System::GetThreadPool()->Post([self = Ref<Connection>(this), handler = std::move(handler)] {
     const std::unique_ptr<EarlyResult> early = std::move(self->early_);
-    handler({self->buffer_.data(), early->size},
-            dynamic_cast<const Exception*>(early->error.get()));
+    handler({self->buffer_.data(), early->size}, early->error.get());
   });
 }
 
@@ -64,7 +64,7 @@ void Connection::OnRead(std::size_t size, const Exception* error) {
     if (!handler) {
       early_ = std::make_unique<EarlyResult>();
       early_->size = size;
-      early_->error = error == nullptr ? nullptr : error->Clone();
+      early_->error = error == nullptr ? nullptr : CopyException(*error);
       return;
     }
   }
@@ -80,7 +80,7 @@ void Connection::Close() noexcept {
 }
 
 void Connection::Watch(std::function<void()> onLost) {
-  // What the last exchange read need not lie here while nobody uses it.
+  // The last answer must not stay in memory during the idle time.
   StringUtil::Cleanse(buffer_);
   Read([onLost = std::move(onLost)](std::string_view, const Exception*) { onLost(); });
 }

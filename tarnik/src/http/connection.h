@@ -15,11 +15,11 @@
 namespace Tarnik::Http {
 
 /// A stream that serves one exchange after the other. While it is idle a read stays under way on
-/// it, so that the peer's close, or bytes that nobody asked for, are seen when they come; the next
-/// exchange takes that read over. Safe from many threads.
+/// it, so that a close by the peer, or unexpected bytes, are noticed at once; the next exchange
+/// takes that read over. Safe from many threads.
 class Connection final : public ObjectImpl {
  public:
-  /// Empty bytes without an error are the orderly end of the connection. Both arguments are valid
+  /// Empty bytes without an error mean the orderly end of the connection. Both arguments are valid
   /// only during the call.
   using ReadHandler = std::function<void(std::string_view bytes, const Exception* error)>;
 
@@ -28,24 +28,24 @@ class Connection final : public ObjectImpl {
   /// True when the stream is TLS.
   bool IsSecure() const noexcept { return isSecure_; }
 
-  /// Waits for the next bytes, or for those that have come since `Claim`. One read at a time. The
-  /// handler runs once, on an I/O thread.
+  /// Reads the next bytes, or returns those that have arrived since `Claim`. One read at a time.
+  /// The handler runs once, on an I/O thread.
   void Read(ReadHandler handler);
   /// Writes all of `data`, which must live until the completion has run.
   void Write(std::string_view data, System::Stream::WriteCompletion completion);
   void Close() noexcept;
 
-  /// Begins to be idle: `onLost` runs, on an I/O thread, when the connection turns out to be of no
-  /// further use.
+  /// Starts the idle time: `onLost` runs, on an I/O thread, when the connection can no longer be
+  /// used.
   void Watch(std::function<void()> onLost);
-  /// Ends being idle; false when the connection has been lost.
+  /// Ends the idle time; false when the connection has been lost.
   bool Claim();
 
  private:
-  /// What a read that nobody waited for has brought.
+  /// The result of a read that ended before `Read` was called.
   struct EarlyResult {
     std::size_t size = 0;
-    std::shared_ptr<const Throwable> error;
+    std::shared_ptr<const Exception> error;
   };
 
   ~Connection() override;

@@ -3,7 +3,7 @@
 #include <array>
 #include <chrono>
 
-#include "http/characters.h"
+#include "support/ascii.h"
 
 namespace Tarnik::Http {
 namespace {
@@ -20,7 +20,7 @@ bool IsDelimiter(char c) noexcept {
          (code >= 0x5B && code <= 0x60) || (code >= 0x7B && code <= 0x7E);
 }
 
-/// Takes a number of `least` to `most` digits off the front of `text`.
+/// Removes a number of `least` to `most` digits from the front of `text`.
 std::optional<int> TakeNumber(std::string_view& text, std::size_t least, std::size_t most) {
   std::size_t length = 0;
   int value = 0;
@@ -67,7 +67,7 @@ std::optional<int> ParseMonth(std::string_view token) {
   return std::nullopt;
 }
 
-/// What the tokens of a date have given so far; each field is filled by the first token that fits.
+/// The fields of a date read so far. The first token that fits a field sets it.
 class DateFields {
  public:
   void Take(std::string_view token) {

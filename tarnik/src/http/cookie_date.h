@@ -8,7 +8,8 @@
 
 namespace Tarnik::Http {
 
-/// Reads a date as cookies carry it, in any of the forms of the wild (RFC 6265, section 5.1.1).
+/// Parses the date of a cookie in any of the forms that servers send (RFC 6265, section 5.1.1).
+/// Nothing when the text is not a date.
 std::optional<System::DateTime> ParseCookieDate(std::string_view text);
 
 }  // namespace Tarnik::Http

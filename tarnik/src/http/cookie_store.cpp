@@ -9,8 +9,8 @@
 #include <tarnik/core/object_impl.h>
 #include <tarnik/text/string_util.h>
 
-#include "http/host_name.h"
 #include "http/set_cookie.h"
+#include "system/host_name.h"
 
 namespace Tarnik::Http {
 namespace {
@@ -20,7 +20,7 @@ constexpr std::size_t kMaxCookies = 300;
 
 struct Cookie {
   SetCookie given;
-  /// Goes to `given.domain` alone, not to hosts below it.
+  /// Sent only to `given.domain`, not to its subdomains.
   bool isHostOnly;
 };
 
@@ -32,7 +32,7 @@ bool DomainMatches(std::string_view host, std::string_view domain) {
   if (host.size() <= domain.size() || !host.ends_with(domain)) {
     return false;
   }
-  return host[host.size() - domain.size() - 1] == '.' && IsDnsName(host);
+  return host[host.size() - domain.size() - 1] == '.' && System::IsDnsName(host);
 }
 
 /// RFC 6265, section 5.1.4.
@@ -79,7 +79,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
 
   void Store(std::string_view host, std::string_view path, bool isSecure,
              std::string_view setCookie, const System::DateTime& now) override {
-    std::optional<Cookie> cookie = Judge(host, path, isSecure, setCookie, now);
+    std::optional<Cookie> cookie = Accept(host, path, isSecure, setCookie, now);
     if (!cookie) {
       return;
     }
@@ -91,7 +91,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
       Add(std::move(*cookie), now);
       return;
     }
-    // A peer on plain HTTP could be anyone; it may not replace what only TLS may see.
+    // A peer on plain HTTP is not authenticated, so it must not replace a Secure cookie.
     if (old->given.isSecure && !isSecure) {
       return;
     }
@@ -99,7 +99,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
       cookies_.erase(old);
       return;
     }
-    // RFC 6265, section 5.3, step 11: the creation time, here the place, stays.
+    // RFC 6265, section 5.3, step 11: the creation time, here the position, is kept.
     *old = std::move(*cookie);
   }
 
@@ -111,7 +111,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
     DropExpired(now);
     std::vector<const Cookie*> matches;
     for (const Cookie& cookie : cookies_) {
-      if (GoesTo(cookie, lowerHost, requestPath, isSecure)) {
+      if (AppliesTo(cookie, lowerHost, requestPath, isSecure)) {
         matches.push_back(&cookie);
       }
     }
@@ -123,15 +123,16 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
   }
 
  private:
-  static std::optional<Cookie> Judge(std::string_view host, std::string_view path, bool isSecure,
-                                     std::string_view setCookie, const System::DateTime& now) {
+  /// The cookie to store; nothing when RFC 6265, section 5.3 says to ignore it.
+  static std::optional<Cookie> Accept(std::string_view host, std::string_view path, bool isSecure,
+                                      std::string_view setCookie, const System::DateTime& now) {
     std::optional<SetCookie> given = ParseSetCookie(setCookie, now);
     if (!given || (given->isSecure && !isSecure)) {
       return std::nullopt;
     }
     const std::string lowerHost = StringUtil::ToLower(host);
     const bool isHostOnly = given->domain.empty() || given->domain == lowerHost;
-    if (!isHostOnly && !MayServe(lowerHost, given->domain)) {
+    if (!isHostOnly && !IsAllowedDomain(lowerHost, given->domain)) {
       return std::nullopt;
     }
     if (given->domain.empty()) {
@@ -143,14 +144,14 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
     return Cookie{std::move(*given), isHostOnly};
   }
 
-  // RFC 6265, section 5.3, step 5: no cookie for a public suffix. Without a list of them, a domain
-  // of one label is known to be one.
-  static bool MayServe(std::string_view host, std::string_view domain) {
+  // RFC 6265, section 5.3, step 5: no cookie for a public suffix. Without a list of these, only a
+  // domain of one label is recognised as one.
+  static bool IsAllowedDomain(std::string_view host, std::string_view domain) {
     return domain.find('.') != std::string_view::npos && DomainMatches(host, domain);
   }
 
-  static bool GoesTo(const Cookie& cookie, std::string_view host, std::string_view path,
-                     bool isSecure) {
+  static bool AppliesTo(const Cookie& cookie, std::string_view host, std::string_view path,
+                        bool isSecure) {
     if (cookie.given.isSecure && !isSecure) {
       return false;
     }
@@ -178,12 +179,12 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
     if (IsExpired(cookie, now)) {
       return;
     }
-    const auto isNeighbour = [&](const Cookie& each) {
+    const auto hasSameDomain = [&](const Cookie& each) {
       return each.given.domain == cookie.given.domain;
     };
-    if (static_cast<std::size_t>(std::count_if(cookies_.begin(), cookies_.end(), isNeighbour)) ==
+    if (static_cast<std::size_t>(std::count_if(cookies_.begin(), cookies_.end(), hasSameDomain)) ==
         kMaxCookiesPerHost) {
-      cookies_.erase(std::find_if(cookies_.begin(), cookies_.end(), isNeighbour));
+      cookies_.erase(std::find_if(cookies_.begin(), cookies_.end(), hasSameDomain));
     }
     if (cookies_.size() == kMaxCookies) {
       cookies_.erase(cookies_.begin());
@@ -193,8 +194,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
 
   const std::string name_;
   std::mutex mutex_;
-  /// The oldest first.
-  std::vector<Cookie> cookies_;
+  std::vector<Cookie> cookies_;  // the oldest first
 };
 
 }  // namespace

@@ -9,14 +9,12 @@
 #include <tarnik/system/date_time.h>
 #include <tarnik/system/thread_pool.h>
 
-#include "http/characters.h"
+#include "core/copy_exception.h"
+#include "support/ascii.h"
+#include "system/host_name.h"
 
 namespace Tarnik::Http {
 namespace {
-
-std::shared_ptr<Exception> Copy(const Exception& exception) {
-  return std::dynamic_pointer_cast<Exception>(std::shared_ptr<Throwable>(exception.Clone()));
-}
 
 std::string DurationText(unsigned long microseconds) {
   constexpr unsigned long kPerSecond = 1000000;
@@ -33,15 +31,15 @@ std::string DurationText(unsigned long microseconds) {
   return std::to_string(microseconds) + " microseconds";
 }
 
-TimeoutException NoAnswer(const Place& place, unsigned long microseconds) {
-  return TimeoutException("No answer from " + place.endpointKey + " within " +
+TimeoutException NoAnswer(const Endpoint& endpoint, unsigned long microseconds) {
+  return TimeoutException("No answer from " + endpoint.key + " within " +
                           DurationText(microseconds) + ".");
 }
 
 }  // namespace
 
 Exchange::Exchange(Parts parts)
-    : place_(std::move(parts.place)),
+    : endpoint_(std::move(parts.endpoint)),
       host_(std::move(parts.host)),
       cookieHost_(std::move(parts.cookieHost)),
       isProxy_(parts.isProxy),
@@ -50,7 +48,7 @@ Exchange::Exchange(Parts parts)
       target_(parts.request->Target()),
       request_(std::move(parts.request)),
       completion_(std::move(parts.completion)),
-      parser_(place_.endpointKey) {}
+      parser_(endpoint_.key) {}
 
 Exchange::~Exchange() = default;
 
@@ -59,7 +57,7 @@ void Exchange::Start(unsigned long timeoutMicroseconds) {
     SetTimer(timeoutMicroseconds);
   }
   if (const auto idle = idle_.lock()) {
-    if (const Ref<Connection> connection = idle->Take(place_)) {
+    if (const Ref<Connection> connection = idle->Take(endpoint_)) {
       Begin(connection);
       return;
     }
@@ -68,7 +66,7 @@ void Exchange::Start(unsigned long timeoutMicroseconds) {
     Connect();
   } catch (...) {
     const auto work = Settle({});
-    // When the time limit has struck already, that is what the completion has heard.
+    // If the time limit has passed already, the completion has reported that.
     if (!work) {
       return;
     }
@@ -81,7 +79,7 @@ void Exchange::SetTimer(unsigned long timeoutMicroseconds) {
   const Ref<Exchange> self(this);
   const auto timer = System::GetThreadPool()->RunAfter(
       timeoutMicroseconds,
-      [self, timeoutMicroseconds] { self->Fail(NoAnswer(self->place_, timeoutMicroseconds)); });
+      [self, timeoutMicroseconds] { self->Fail(NoAnswer(self->endpoint_, timeoutMicroseconds)); });
   const std::lock_guard guard(mutex_);
   if (!hasEnded_) {
     work_.timer = timer;
@@ -90,12 +88,12 @@ void Exchange::SetTimer(unsigned long timeoutMicroseconds) {
 
 void Exchange::Connect() {
   const Ref<Exchange> self(this);
-  const auto connect = place_.spec->StartConnect(
+  const auto connect = endpoint_.spec->StartConnect(
       [self](System::Stream* stream, const Exception* error) { self->OnConnected(stream, error); });
   {
     const std::lock_guard guard(mutex_);
-    // The completion may have been faster than this thread, and what it was given may even serve
-    // another exchange by now.
+    // The completion may have run before this thread continued, and its connection may even serve
+    // another exchange already.
     if (hasConnectEnded_) {
       return;
     }
@@ -123,8 +121,7 @@ void Exchange::OnConnected(System::Stream* stream, const Exception* error) {
     return;
   }
   if (stream == nullptr) {
-    Fail(
-        HttpException("The connection to " + place_.endpointKey + " was opened without a stream."));
+    Fail(HttpException("The connection to " + endpoint_.key + " was opened without a stream."));
     return;
   }
   Begin(MakeRef<Connection>(Ref<System::Stream>(stream)));
@@ -179,7 +176,7 @@ void Exchange::OnRead(const Ref<Connection>& connection, std::string_view bytes,
   if (HasEnded()) {
     return;
   }
-  if (const auto failure = Take(bytes, error)) {
+  if (const auto failure = Parse(bytes, error)) {
     Fail(*failure);
     return;
   }
@@ -190,9 +187,9 @@ void Exchange::OnRead(const Ref<Connection>& connection, std::string_view bytes,
   OnAnswer();
 }
 
-std::shared_ptr<Exception> Exchange::Take(std::string_view bytes, const Exception* error) {
+std::shared_ptr<Exception> Exchange::Parse(std::string_view bytes, const Exception* error) {
   if (error != nullptr) {
-    return Copy(*error);
+    return CopyException(*error);
   }
   try {
     if (bytes.empty()) {
@@ -201,10 +198,10 @@ std::shared_ptr<Exception> Exchange::Take(std::string_view bytes, const Exceptio
       parser_.Feed(bytes);
     }
   } catch (const Exception& exception) {
-    return Copy(exception);
+    return CopyException(exception);
   } catch (const std::bad_alloc&) {
     return std::make_shared<HttpException>("There is not enough memory for the answer from " +
-                                           place_.endpointKey + ".");
+                                           endpoint_.key + ".");
   }
   return nullptr;
 }
@@ -214,8 +211,8 @@ void Exchange::OnAnswer() {
   {
     const std::lock_guard guard(mutex_);
     if (mayReuse && !isWritten_) {
-      // Most often the completion of the write is just late. Who answers early and does not mean to
-      // read on says so with "Connection: close" (RFC 9112, section 9.5).
+      // Usually the completion of the write is only late. A peer that answers early and will not
+      // read the rest says so with "Connection: close" (RFC 9112, section 9.5).
       isAnswerWaiting_ = true;
       return;
     }
@@ -249,9 +246,8 @@ RequestRoute Exchange::Route(bool isSecure) const {
 
 // RFC 9110, section 7.2: the host and, unless it is the scheme's own, the port.
 std::string Exchange::HostField(bool isSecure) const {
-  const bool isIPv6 = host_.find(':') != std::string::npos;
-  std::string host = isIPv6 ? "[" + host_ + "]" : host_;
-  const std::string& key = place_.endpointKey;
+  std::string host = System::BracketIPv6(host_);
+  const std::string& key = endpoint_.key;
   const auto colon = key.rfind(':');
   const std::string port = colon == std::string::npos ? std::string() : key.substr(colon + 1);
   if (!AreDigits(port) || port == (isSecure ? "443" : "80")) {
@@ -287,11 +283,11 @@ bool Exchange::HasEnded() {
 }
 
 bool Exchange::Cancel() {
-  return FailLater(CancelledException("The request to " + place_.endpointKey + " was cancelled."));
+  return FailLater(CancelledException("The request to " + endpoint_.key + " was cancelled."));
 }
 
 Ref<ClientResponse> Exchange::Wait(unsigned long timeoutMicroseconds) {
-  // Longer than any process lives, and short enough for the clock to add.
+  // Longer than any process runs, and short enough to be added to the clock's time.
   constexpr unsigned long kMaxMicroseconds = 1000000000000000;
   const auto isDelivered = [this] { return isDelivered_; };
   std::unique_lock lock(mutex_);
@@ -299,7 +295,7 @@ Ref<ClientResponse> Exchange::Wait(unsigned long timeoutMicroseconds) {
     const std::chrono::microseconds limit(std::min(timeoutMicroseconds, kMaxMicroseconds));
     if (!deliveredSignal_.wait_for(lock, limit, isDelivered)) {
       lock.unlock();
-      FailLater(NoAnswer(place_, timeoutMicroseconds));
+      FailLater(NoAnswer(endpoint_, timeoutMicroseconds));
       lock.lock();
     }
   }
@@ -311,14 +307,14 @@ Ref<ClientResponse> Exchange::Wait(unsigned long timeoutMicroseconds) {
 }
 
 void Exchange::Fail(const Exception& failure) {
-  if (const auto work = Settle({Copy(failure), nullptr})) {
+  if (const auto work = Settle({CopyException(failure), nullptr})) {
     Release(*work, false);
     Deliver();
   }
 }
 
 bool Exchange::FailLater(const Exception& failure) {
-  const auto work = Settle({Copy(failure), nullptr});
+  const auto work = Settle({CopyException(failure), nullptr});
   if (!work) {
     return false;
   }
@@ -327,7 +323,7 @@ bool Exchange::FailLater(const Exception& failure) {
   return true;
 }
 
-std::optional<Exchange::Work> Exchange::Settle(Outcome outcome) {
+std::optional<Exchange::PendingWork> Exchange::Settle(Outcome outcome) {
   Ref<ClientRequestImpl> request;
   const std::lock_guard guard(mutex_);
   if (std::exchange(hasEnded_, true)) {
@@ -338,7 +334,7 @@ std::optional<Exchange::Work> Exchange::Settle(Outcome outcome) {
   return std::exchange(work_, {});
 }
 
-void Exchange::Release(const Work& work, bool mayReuse) const {
+void Exchange::Release(const PendingWork& work, bool mayReuse) const {
   if (work.timer != nullptr) {
     work.timer->Cancel();
   }
@@ -353,7 +349,7 @@ void Exchange::Release(const Work& work, bool mayReuse) const {
     work.connection->Close();
     return;
   }
-  idle->Put(place_, work.connection);
+  idle->Put(endpoint_, work.connection);
 }
 
 void Exchange::Deliver() {
@@ -363,7 +359,8 @@ void Exchange::Deliver() {
     completion.swap(completion_);
   }
   completion(outcome_.failure.get(), outcome_.response.get(), this);
-  // What the completion holds goes before a waiting thread may go on and take it apart.
+  // What the completion captured is destroyed before a waiting thread continues, since that thread
+  // may destroy objects that the captures refer to.
   completion = nullptr;
   {
     const std::lock_guard guard(mutex_);

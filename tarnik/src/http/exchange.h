@@ -11,23 +11,23 @@
 #include <tarnik/http/cookie_store.h>
 #include <tarnik/http/http_user_agent.h>
 
-#include "http/client_request.h"
 #include "http/connection.h"
-#include "http/connection_pool.h"
+#include "http/http_request_impl.h"
+#include "http/idle_connections.h"
 #include "http/response_parser.h"
 
 namespace Tarnik::Http {
 
 /// One request and its answer: connects or takes an idle connection, writes, reads, and ends once,
-/// by whatever comes first: the answer, a failure, its time limit or `Cancel`.
+/// with whatever comes first: the answer, a failure, its time limit or `Cancel`.
 ///
-/// The read starts with the write, so that a close or an early answer is seen at once. What
-/// operations under way need, their completions keep alive.
+/// The read starts together with the write, so that a close or an early answer is noticed at once.
+/// The completions of operations under way keep alive what these operations use.
 class Exchange final : public PendingRequestItem, public ObjectImpl {
  public:
-  /// What an exchange works with.
+  /// What an exchange is made from.
   struct Parts {
-    Place place;
+    Endpoint endpoint;
     std::string host;
     std::string cookieHost;
     bool isProxy;
@@ -40,21 +40,21 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
 
   explicit Exchange(Parts parts);
 
-  /// Begins; `timeoutMicroseconds` of 0 sets no limit. Throws what the spec throws when it cannot
-  /// even begin to connect; the completion then never runs.
+  /// Starts the exchange; a `timeoutMicroseconds` of 0 sets no limit. Throws what the spec throws
+  /// when it cannot begin to connect; the completion then never runs.
   void Start(unsigned long timeoutMicroseconds);
   bool Cancel() override;
   /// As `UserAgent::Wait`.
   Ref<ClientResponse> Wait(unsigned long timeoutMicroseconds);
 
  private:
-  /// How an exchange has ended: by exactly one of the two.
+  /// How an exchange ended. Exactly one of the two is set.
   struct Outcome {
     std::shared_ptr<Exception> failure;
     Ref<ClientResponse> response;
   };
-  /// What is under way on behalf of the exchange.
-  struct Work {
+  /// The operations under way for the exchange.
+  struct PendingWork {
     Ref<System::CancellableItem> timer;
     Ref<System::CancellableItem> connect;
     Ref<Connection> connection;
@@ -69,8 +69,8 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   void Read(const Ref<Connection>& connection);
   void OnWritten(const Exception* error);
   void OnRead(const Ref<Connection>& connection, std::string_view bytes, const Exception* error);
-  /// Feeds the parser; gives what is wrong, if anything.
-  std::shared_ptr<Exception> Take(std::string_view bytes, const Exception* error);
+  /// Passes the result of a read to the parser; returns the failure, or null.
+  std::shared_ptr<Exception> Parse(std::string_view bytes, const Exception* error);
   void OnAnswer();
   void Finish(bool mayReuse);
 
@@ -80,17 +80,19 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   void StoreCookies(const ClientResponseImpl& response, bool isSecure) const;
 
   bool HasEnded();
-  /// On an I/O thread: ends with a copy of `failure` and runs the completion.
+  /// Ends with a copy of `failure` and runs the completion. Called on an I/O thread.
   void Fail(const Exception& failure);
-  /// On any thread: the same, but the completion runs later. False when it had ended before.
+  /// The same on any thread, but the completion runs later. False when the exchange had ended
+  /// before.
   bool FailLater(const Exception& failure);
-  /// Settles the outcome, unless there is one, and gives what was under way.
-  std::optional<Work> Settle(Outcome outcome);
-  /// Stops what was under way; a connection in good order may serve the next exchange.
-  void Release(const Work& work, bool mayReuse) const;
+  /// Sets the outcome and returns the operations under way; nothing when there is an outcome
+  /// already.
+  std::optional<PendingWork> Settle(Outcome outcome);
+  /// Stops the operations under way and closes the connection, or keeps it if `mayReuse`.
+  void Release(const PendingWork& work, bool mayReuse) const;
   void Deliver();
 
-  const Place place_;
+  const Endpoint endpoint_;
   const std::string host_;
   const std::string cookieHost_;
   const bool isProxy_;
@@ -102,18 +104,18 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   std::condition_variable deliveredSignal_;
   Ref<ClientRequestImpl> request_;
   UserAgent::Completion completion_;
-  Work work_;
+  PendingWork work_;
   Outcome outcome_;
   bool hasEnded_ = false;
   bool hasConnectEnded_ = false;
   bool isDelivered_ = false;
   bool isWritten_ = false;
-  /// The whole answer is there, and its connection is good for another once the request is written.
+  /// The answer is complete; its connection may be kept once the request has been written.
   bool isAnswerWaiting_ = false;
 
-  /// Touched by the start of the write and by its completion alone.
+  /// Used only by the start of the write and by its completion.
   SensitiveText wire_;
-  /// Touched by the one read under way and, after the last of them, by the end alone.
+  /// Used only by the read under way and, after the last read, by `Finish`.
   ResponseParser parser_;
 };
 

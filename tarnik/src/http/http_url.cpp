@@ -5,8 +5,8 @@
 
 #include <tarnik/core/exception.h>
 
-#include "http/characters.h"
-#include "http/host_name.h"
+#include "support/ascii.h"
+#include "system/host_name.h"
 
 namespace Tarnik::Http {
 namespace {
@@ -54,15 +54,15 @@ bool TakeScheme(std::string_view& url) {
   Refuse("it does not begin with http:// or https://");
 }
 
-// RFC 3986, section 3.2.2: only an address may stand in brackets. A zone (RFC 6874) means nothing
-// to anyone but this machine and is refused with the rest.
+// RFC 3986, section 3.2.2: only an IPv6 address may be in brackets. A zone (RFC 6874) is meaningful
+// only on this machine, so it is refused too.
 std::string_view TakeBracketedHost(std::string_view& authority) {
   const auto end = authority.find(']');
   if (end == std::string_view::npos) {
     Refuse("the bracket before the host is not closed");
   }
   const std::string_view host = authority.substr(1, end - 1);
-  if (!IsIPv6Address(host)) {
+  if (!System::IsIPv6Address(host)) {
     Refuse("the host in brackets is not an IPv6 address");
   }
   authority.remove_prefix(end + 1);
@@ -77,7 +77,7 @@ std::string_view TakeHost(std::string_view& authority) {
   if (host.empty()) {
     Refuse("the host is missing");
   }
-  if (!IsDnsName(host) && !IsIPv4Address(host)) {
+  if (!System::IsDnsName(host) && !System::IsIPv4Address(host)) {
     Refuse("the host is neither a name nor an address");
   }
   authority.remove_prefix(host.size());
@@ -106,7 +106,7 @@ int TakePort(std::string_view rest, int defaultPort) {
     Refuse("something other than a port follows the host");
   }
   rest.remove_prefix(1);
-  // RFC 3986, section 3.2.3: the port may be empty and is then the scheme's own.
+  // RFC 3986, section 3.2.3: an empty port means the default port of the scheme.
   return rest.empty() ? defaultPort : ParsePort(rest);
 }
 
@@ -121,7 +121,7 @@ void CheckEscapes(std::string_view path) {
 }
 
 void CheckPath(std::string_view path) {
-  // RFC 3986, appendix A: what pchar, "/" and "?" leave out of printable ASCII.
+  // RFC 3986, appendix A: printable ASCII that pchar, "/" and "?" do not include.
   if (path.find_first_of("\"<>[\\]^`{|}") != std::string_view::npos) {
     Refuse("the path or query holds a character that must be percent-encoded");
   }

@@ -1,18 +1,37 @@
 #include <tarnik/http/http_user_agent.h>
 
+#include <memory>
 #include <string>
+#include <string_view>
 #include <utility>
 
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/object_impl.h>
 
-#include "http/client_request.h"
-#include "http/connection_pool.h"
 #include "http/exchange.h"
-#include "http/host_name.h"
+#include "http/http_request_impl.h"
+#include "http/idle_connections.h"
+#include "system/host_name.h"
 
 namespace Tarnik::Http {
 namespace {
+
+class ConnectionPoolImpl final : public ConnectionPool, public ObjectImpl {
+ public:
+  ConnectionPoolImpl() : idle_(std::make_shared<IdleConnections>()) {}
+
+  /// Weak, since an exchange may outlive the pool.
+  std::weak_ptr<IdleConnections> Idle() const noexcept { return idle_; }
+
+ private:
+  ~ConnectionPoolImpl() override = default;
+
+  const std::shared_ptr<IdleConnections> idle_;
+};
+
+bool IsHost(std::string_view host) noexcept {
+  return System::IsDnsName(host) || System::IsIPv4Address(host) || System::IsIPv6Address(host);
+}
 
 class UserAgentImpl final : public UserAgent, public ObjectImpl {
  public:
@@ -29,7 +48,7 @@ class UserAgentImpl final : public UserAgent, public ObjectImpl {
       throw InvalidArgumentException("The completion of an HTTP request is empty.");
     }
     const std::string host = spec_->Host();
-    // It becomes part of what is sent: RFC 9110, section 7.2.
+    // The host becomes part of the request (RFC 9110, section 7.2).
     if (!IsHost(host)) {
       throw InvalidArgumentException("The host to connect to is neither a name nor an address.");
     }
@@ -61,6 +80,10 @@ class UserAgentImpl final : public UserAgent, public ObjectImpl {
 };
 
 }  // namespace
+
+Ref<ConnectionPool> CreateConnectionPool() {
+  return MakeRef<ConnectionPoolImpl>();
+}
 
 Ref<UserAgent> CreateHttpUserAgent(ConnectionSpec* spec, CookieStore* cookies,
                                    ConnectionPool* pool) {

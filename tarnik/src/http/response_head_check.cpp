@@ -1,13 +1,14 @@
 #include "http/response_head_check.h"
 
-#include "http/characters.h"
+#include "http/field_syntax.h"
+#include "support/ascii.h"
 
 namespace Tarnik::Http {
 namespace {
 
 constexpr std::string_view kLineEnd = "\r\n";
 
-/// What the fields say about the length of the body.
+/// What the header fields say about the length of the body.
 struct Framing {
   bool hasLength = false;
   bool isChunked = false;
@@ -35,7 +36,7 @@ void CheckStatusLine(std::string_view line) {
 }
 
 void CheckLength(std::string_view value, Framing& framing) {
-  // RFC 9112, section 6.3: also a repetition of the same number is refused.
+  // RFC 9112, section 6.3. A repetition of the same number is refused too.
   if (framing.hasLength) {
     throw ResponseFault{"gives its Content-Length more than once"};
   }
@@ -83,7 +84,7 @@ void CheckFraming(const Framing& framing, bool isHttp10) {
   if (framing.hasLength) {
     throw ResponseFault{"gives both Content-Length and Transfer-Encoding"};
   }
-  // RFC 9112, section 6.1: such a message is to be taken for faulty framing.
+  // RFC 9112, section 6.1: such a message has faulty framing.
   if (isHttp10) {
     throw ResponseFault{"uses a transfer coding in HTTP/1.0"};
   }

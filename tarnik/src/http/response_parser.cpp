@@ -17,7 +17,7 @@ using BeastError = boost::beast::error_code;
 
 constexpr int kMaxInterimAnswers = 16;
 constexpr int kSwitchingProtocols = 101;
-/// How far the reported length of a body is believed before its bytes have come.
+/// The most memory that is reserved because of Content-Length, before the bytes have arrived.
 constexpr std::size_t kMaxReservedBytes = std::size_t{1} << 20;
 
 std::string_view View(BeastText text) {
@@ -26,7 +26,7 @@ std::string_view View(BeastText text) {
 
 }  // namespace
 
-/// One message, final or interim, made of the parser's events.
+/// One message, final or interim, built from the parser's events.
 class ResponseParser::Message final : public BeastHttp::basic_parser<false> {
  public:
   Message() {
@@ -47,7 +47,7 @@ class ResponseParser::Message final : public BeastHttp::basic_parser<false> {
   }
 
   void on_field_impl(BeastHttp::field, BeastText name, BeastText value, BeastError&) override {
-    // RFC 9110, section 6.5.1: trailer fields are not to be taken for header fields.
+    // RFC 9110, section 6.5.1: trailer fields must not be merged into the header fields.
     if (!isHeadDone_) {
       headers.emplace_back(std::string(name), std::string(value));
     }
@@ -131,14 +131,14 @@ bool ResponseParser::ReadHead() {
   headBytes_ += *size;
   input_.RemovePrefix(*size);
   if (message_->status.code / 100 == 1) {
-    PassOverInterim(message_->status.code);
+    SkipInterim(message_->status.code);
     return true;
   }
   isDone_ = message_->is_done();
   return true;
 }
 
-void ResponseParser::PassOverInterim(int code) {
+void ResponseParser::SkipInterim(int code) {
   if (code == kSwitchingProtocols) {
     Refuse("switches to another protocol, unasked");
   }
@@ -150,7 +150,7 @@ void ResponseParser::PassOverInterim(int code) {
 }
 
 bool ResponseParser::ReadBody() {
-  // Beast's parser, given a last chunk bit by bit, relies on seeing at least these bytes.
+  // Beast's parser needs to see at least these bytes of the last chunk at once.
   constexpr std::size_t kShortestRestOfChunks = std::string_view("0\r\n\r\n").size();
   if (message_->chunked() && input_.Size() < kShortestRestOfChunks) {
     return false;
@@ -170,8 +170,8 @@ bool ResponseParser::ReadBody() {
   return !error;
 }
 
-// Chunk extensions and trailers mean nothing here, and chunks may hold a byte each; without a bound
-// they would let an answer go on for ever without ever reaching the limit of its body.
+// Chunk extensions and trailers are ignored, and a chunk may hold a single byte. Without this limit
+// an answer could go on for ever without reaching the limit of its body.
 void ResponseParser::CheckOverhead() const {
   constexpr std::size_t kFramingPerBodyByte = 8;
   const std::size_t body = message_->body.Size();

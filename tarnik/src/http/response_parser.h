@@ -7,31 +7,31 @@
 
 #include <tarnik/core/ref.h>
 
-#include "http/client_response.h"
+#include "http/http_response_impl.h"
 #include "http/response_head_check.h"
 #include "support/sensitive_text.h"
 
 namespace Tarnik::Http {
 
-/// Reads one answer (RFC 9112) from the bytes of a connection. Pure: it is fed, and knows no
-/// stream. Interim answers (RFC 9110, section 15.2) are passed over.
+/// Parses one answer (RFC 9112) from the bytes of a connection, without I/O of its own. Interim
+/// answers (RFC 9110, section 15.2) are skipped.
 class ResponseParser {
  public:
   /// `peer` names the other end in messages.
   explicit ResponseParser(std::string peer);
   ~ResponseParser();
 
-  /// Takes the next bytes. Throws `HttpException` for an answer that breaks the protocol or a
+  /// Takes the next bytes. Throws `HttpException` for an answer that violates the protocol or a
   /// limit.
   void Feed(std::string_view bytes);
   /// Takes the orderly end of the connection. Throws `HttpException` when it cuts the answer off.
   void FeedEnd();
 
-  /// True when the answer is whole.
+  /// True when the answer is complete.
   bool IsDone() const noexcept { return isDone_; }
-  /// True when the answer is whole and another one may follow on its connection.
+  /// True when the answer is complete and its connection may be used for another exchange.
   bool MayReuseConnection() const noexcept;
-  /// The whole answer, once.
+  /// Moves the complete answer out. Called once.
   Ref<ClientResponseImpl> TakeResponse();
 
  private:
@@ -40,13 +40,12 @@ class ResponseParser {
   void Advance();
   bool ReadHead();
   bool ReadBody();
-  void PassOverInterim(int code);
+  void SkipInterim(int code);
   void CheckOverhead() const;
   [[noreturn]] void Refuse(std::string_view fault) const;
 
   const std::string peer_;
-  /// Bytes that no message has consumed yet.
-  SensitiveText input_;
+  SensitiveText input_;  // bytes that no message has consumed yet
   ResponseHeadScanner scanner_;
   std::unique_ptr<Message> message_;
   std::size_t headBytes_ = 0;

@@ -4,8 +4,9 @@
 
 #include <tarnik/text/string_util.h>
 
-#include "http/characters.h"
 #include "http/cookie_date.h"
+#include "http/field_syntax.h"
+#include "support/ascii.h"
 
 namespace Tarnik::Http {
 namespace {
@@ -18,11 +19,11 @@ struct NameAndValue {
   bool hasValue;
 };
 
-bool HoldsControl(std::string_view text) {
+bool HasControl(std::string_view text) {
   return std::any_of(text.begin(), text.end(), IsControl);
 }
 
-/// Takes the text before the next semicolon off `header` and splits it at its first "=".
+/// Removes the text before the next semicolon from `header` and splits it at its first "=".
 NameAndValue TakePair(std::string_view& header) {
   const auto end = std::min(header.find(';'), header.size());
   const std::string_view pair = header.substr(0, end);
@@ -34,7 +35,7 @@ NameAndValue TakePair(std::string_view& header) {
   return {TrimBlanks(pair.substr(0, equals)), TrimBlanks(pair.substr(equals + 1)), true};
 }
 
-/// RFC 6265, section 5.2.2: zero and less mean at once; none when it is not a number.
+/// RFC 6265, section 5.2.2: zero or less expires at once. Nothing when `text` is not a number.
 std::optional<long> ParseMaxAge(std::string_view text) {
   const bool isNegative = !text.empty() && text.front() == '-';
   if (isNegative) {
@@ -50,11 +51,11 @@ std::optional<long> ParseMaxAge(std::string_view text) {
   return isNegative ? 0 : seconds;
 }
 
-class Reading {
+class AttributeReader {
  public:
-  Reading(SetCookie& cookie, const System::DateTime& now) : cookie_(cookie), now_(now) {}
+  AttributeReader(SetCookie& cookie, const System::DateTime& now) : cookie_(cookie), now_(now) {}
 
-  void Attribute(std::string_view name, std::string_view value) {
+  void Read(std::string_view name, std::string_view value) {
     if (EqualsIgnoringCase(name, "Expires")) {
       TakeExpires(value);
     } else if (EqualsIgnoringCase(name, "Max-Age")) {
@@ -70,7 +71,7 @@ class Reading {
 
  private:
   void TakeExpires(std::string_view value) {
-    // RFC 6265, section 5.3, step 3: Max-Age wins, wherever it stands.
+    // RFC 6265, section 5.3, step 3: Max-Age takes precedence, before or after Expires.
     if (const auto date = ParseCookieDate(value); date && !hasMaxAge_) {
       cookie_.expiry = date;
     }
@@ -110,16 +111,16 @@ std::optional<SetCookie> ParseSetCookie(std::string_view header, const System::D
     return std::nullopt;
   }
   const NameAndValue pair = TakePair(header);
-  if (!pair.hasValue || pair.name.empty() || HoldsControl(pair.name) || HoldsControl(pair.value)) {
+  if (!pair.hasValue || pair.name.empty() || HasControl(pair.name) || HasControl(pair.value)) {
     return std::nullopt;
   }
   SetCookie cookie;
   cookie.name = pair.name;
   cookie.value = pair.value;
-  Reading reading(cookie, now);
+  AttributeReader attributes(cookie, now);
   while (!header.empty()) {
     const NameAndValue attribute = TakePair(header);
-    reading.Attribute(attribute.name, attribute.value);
+    attributes.Read(attribute.name, attribute.value);
   }
   return cookie;
 }

@@ -9,10 +9,10 @@
 
 namespace Tarnik::Http {
 
-/// What one cookie, its attributes included, may hold (RFC 6265, section 6.1).
+/// The longest Set-Cookie header that is accepted (RFC 6265, section 6.1).
 inline constexpr std::size_t kMaxCookieBytes = 4096;
 
-/// A Set-Cookie header, read but not yet judged.
+/// The content of a Set-Cookie header, not yet validated against the request.
 struct SetCookie {
   std::string name;
   std::string value;
@@ -20,13 +20,13 @@ struct SetCookie {
   std::string domain;
   /// Empty when not given or not absolute.
   std::string path;
-  /// The instant from which the cookie is gone; none for one that lives as long as the store.
+  /// When the cookie expires; nothing for one that lives as long as the store.
   std::optional<System::DateTime> expiry;
   bool isSecure = false;
 };
 
-/// Reads a Set-Cookie header (RFC 6265, section 5.2). None for one without a name, with control
-/// characters, or longer than `kMaxCookieBytes`.
+/// Parses a Set-Cookie header (RFC 6265, section 5.2). Nothing for a header without a name, with
+/// control characters, or longer than `kMaxCookieBytes`.
 std::optional<SetCookie> ParseSetCookie(std::string_view header, const System::DateTime& now);
 
 }  // namespace Tarnik::Http

@@ -13,13 +13,15 @@
 
 #include <tarnik/core/exception.h>
 
+#include "support/ascii.h"
+
 namespace Tarnik::Service {
 
 struct StaticLogger::Entry {
   std::atomic<int> level{4};
 };
 
-// Lives until the process has ended: worker threads may still log while static objects die.
+// Never destroyed, since worker threads may still log while static objects are destroyed.
 class LogRegistry {
  public:
   static LogRegistry& Get() {
@@ -69,11 +71,7 @@ class LogRegistry {
 
 namespace {
 
-bool IsControl(char c) {
-  return static_cast<unsigned char>(c) < 0x20 || c == 0x7F;
-}
-
-// Keeps one call to one line, whatever a user name or a fault text holds.
+// So that one call writes one line, whatever a user name or a fault text contains.
 std::string EscapeControls(const std::string& text) {
   if (std::none_of(text.begin(), text.end(), IsControl)) {
     return text;
@@ -105,7 +103,7 @@ void LogInternal(const StaticLogger& logger, int level, std::string_view format,
   if (!logger.IsEnabled(level)) {
     return;
   }
-  // An operation must not fail because its log line could not be written.
+  // An operation must not fail because a log line cannot be written.
   try {
     const std::string text = EscapeControls(Detail::ASPrintInternal(format, arguments));
     LogRegistry::Get().Write({logger.Name(), level, text});

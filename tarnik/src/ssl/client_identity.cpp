@@ -7,19 +7,13 @@
 #include <string>
 
 #include "crypto/private_key_impl.h"
+#include "ssl/decode_certificate.h"
 #include "support/openssl_error.h"
 
 namespace Tarnik::Ssl {
 namespace {
 
-// By its bytes: `certificate` may be of the caller's own making.
-OpenSsl::OwnedCertificate Decode(const Crypto::Certificate& certificate) {
-  const unsigned char* bytes = certificate.DerBytes();
-  return OpenSsl::OwnedCertificate(
-      d2i_X509(nullptr, &bytes, static_cast<long>(certificate.DerLength())));
-}
-
-void RequireWhole(const SSLContextConfig& config) {
+void RequireKeyAndCertificate(const SSLContextConfig& config) {
   if (config.clientPrivateKey == nullptr) {
     throw SSLException(
         "The SSL context has a client certificate without the private key that belongs to it.");
@@ -30,7 +24,7 @@ void RequireWhole(const SSLContextConfig& config) {
   }
 }
 
-const Crypto::PrivateKeyImpl& RequireMatch(const SSLContextConfig& config) {
+const Crypto::PrivateKeyImpl& RequireMatchingKey(const SSLContextConfig& config) {
   const auto* key = dynamic_cast<const Crypto::PrivateKeyImpl*>(config.clientPrivateKey.get());
   if (key == nullptr) {
     throw SSLException("The client's private key was not made by this library.");
@@ -47,9 +41,10 @@ const Crypto::PrivateKeyImpl& RequireMatch(const SSLContextConfig& config) {
                      subject + ".");
 }
 
-void UsePair(const SSLContextConfig& config, const Crypto::PrivateKeyImpl& key, SSL_CTX* context) {
+void SetKeyAndCertificate(const SSLContextConfig& config, const Crypto::PrivateKeyImpl& key,
+                          SSL_CTX* context) {
   const OpenSsl::ErrorScope errors;
-  const OpenSsl::OwnedCertificate certificate = Decode(*config.clientCertificate);
+  const OpenSsl::OwnedCertificate certificate = DecodeCertificate(*config.clientCertificate);
   if (certificate == nullptr || SSL_CTX_use_certificate(context, certificate.get()) != 1 ||
       SSL_CTX_use_PrivateKey(context, key.Handle()) != 1) {
     throw SSLException(errors.Describe("Cannot use the client certificate " +
@@ -62,7 +57,7 @@ void AddToChain(const Crypto::Certificate* certificate, SSL_CTX* context) {
     throw InvalidArgumentException("A certificate of the client's chain is null.");
   }
   const OpenSsl::ErrorScope errors;
-  const OpenSsl::OwnedCertificate decoded = Decode(*certificate);
+  const OpenSsl::OwnedCertificate decoded = DecodeCertificate(*certificate);
   if (decoded == nullptr || SSL_CTX_add1_chain_cert(context, decoded.get()) != 1) {
     throw SSLException(errors.Describe("Cannot use the certificate " + certificate->SubjectName() +
                                        " in the client's chain"));
@@ -72,7 +67,7 @@ void AddToChain(const Crypto::Certificate* certificate, SSL_CTX* context) {
 }  // namespace
 
 void LoadClientIdentity(const SSLContextConfig& config, SSL_CTX* context) {
-  // What is sent is what was configured: OpenSSL would fill the chain from the trusted CAs.
+  // Only the configured chain is sent: by default OpenSSL completes it from the trusted CAs.
   SSL_CTX_set_mode(context, SSL_MODE_NO_AUTO_CHAIN);
   if (config.clientCertificate == nullptr && config.clientPrivateKey == nullptr) {
     if (!config.clientCertificateChain.empty()) {
@@ -80,8 +75,8 @@ void LoadClientIdentity(const SSLContextConfig& config, SSL_CTX* context) {
     }
     return;
   }
-  RequireWhole(config);
-  UsePair(config, RequireMatch(config), context);
+  RequireKeyAndCertificate(config);
+  SetKeyAndCertificate(config, RequireMatchingKey(config), context);
   for (const auto& certificate : config.clientCertificateChain) {
     AddToChain(certificate.get(), context);
   }

@@ -7,7 +7,7 @@
 
 namespace Tarnik::Ssl {
 
-/// Gives the client's certificate and key of `config`, if any, to `context`. Throws as
+/// Sets the client's certificate and key of `config`, if any, in `context`. Throws as
 /// `CreateSSLContext` does.
 void LoadClientIdentity(const SSLContextConfig& config, SSL_CTX* context);
 

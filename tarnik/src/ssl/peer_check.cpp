@@ -12,7 +12,7 @@ namespace {
 
 constexpr std::size_t kMaxDescribedName = 256;
 
-// RFC 2253 form with control characters escaped: the peer chooses this text.
+// In RFC 2253 form, which escapes control characters, since the peer chooses this text.
 std::string Describe(const X509_NAME* name) {
   const OpenSsl::OwnedBio bio(BIO_new(BIO_s_mem()));
   if (bio == nullptr || X509_NAME_print_ex(bio.get(), name, 0, XN_FLAG_RFC2253) < 0) {
@@ -58,7 +58,7 @@ void ExpectAddress(X509_VERIFY_PARAM* parameters, const std::string& address) {
 }  // namespace
 
 PeerCheck::PeerCheck(const std::string& expected, const PinnedCertificates& pinned)
-    // A name may be written with the full stop of the DNS root; certificates and SNI are without
+    // A name may end with the full stop of the DNS root, which certificates and SNI do not have
     // (RFC 6066, section 3).
     : expected_(expected.back() == '.' ? expected.substr(0, expected.size() - 1) : expected),
       pinned_(pinned) {}
@@ -72,7 +72,8 @@ void PeerCheck::ApplyTo(SSL* ssl) const {
   X509_VERIFY_PARAM_set_hostflags(
       parameters, X509_CHECK_FLAG_NO_PARTIAL_WILDCARDS | X509_CHECK_FLAG_NEVER_CHECK_SUBJECT);
   Require(X509_VERIFY_PARAM_set1_host(parameters, expected_.data(), expected_.size()) == 1);
-  // What the macro SSL_set_tlsext_host_name stands for; the name is copied.
+  // The expansion of the macro SSL_set_tlsext_host_name, without its C-style cast. OpenSSL copies
+  // the name.
   Require(SSL_ctrl(ssl, SSL_CTRL_SET_TLSEXT_HOSTNAME, TLSEXT_NAMETYPE_host_name,
                    const_cast<char*>(expected_.c_str())) == 1);
 }

@@ -11,25 +11,25 @@ namespace Tarnik::Ssl {
 
 using PinnedCertificates = std::vector<Ref<const Crypto::Certificate>>;
 
-/// Whom one connection expects at its other end, and why the peer was not accepted. Used by one
-/// thread at a time; must outlive the connection.
+/// Checks that the peer of one connection is the expected one, and describes why it was refused.
+/// Used by one thread at a time; must outlive the connection.
 class PeerCheck {
  public:
   /// `expected` is a DNS name or an address; `pinned` must outlive this object and may be empty.
   PeerCheck(const std::string& expected, const PinnedCertificates& pinned);
 
-  /// Makes `ssl` ask for its peer by SNI if it is named, and compare that name or address with the
-  /// peer's certificate.
+  /// Makes `ssl` compare the expected name or address with the peer's certificate, and send a name
+  /// as SNI.
   void ApplyTo(SSL* ssl) const;
 
-  /// Looks once more at the outcome of a handshake that has ended; so judges also what a resumed
-  /// session has brought along. False when the peer is not the expected one.
+  /// Checks the result of a completed handshake, so that resumed sessions are checked too. False
+  /// when the peer is not the expected one.
   bool IsAccepted(const SSL* ssl);
 
-  /// Why the peer was refused; empty when it was not.
+  /// Why the peer was refused; empty if it was not.
   const std::string& Failure() const noexcept { return failure_; }
 
-  /// To be called on each step of a verification, with OpenSSL's judgement; returns the final one.
+  /// Called for each step of a verification with OpenSSL's result; returns the final result.
   bool OnVerified(bool isValid, X509_STORE_CTX* context);
 
  private:

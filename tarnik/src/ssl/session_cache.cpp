@@ -8,7 +8,7 @@ namespace Tarnik::Ssl {
 namespace {
 
 bool IsPeerCertificateCurrent(const SSL_SESSION* session) {
-  // OpenSSL's accessor only lacks the const.
+  // OpenSSL's accessor lacks the const but does not modify the session.
   const X509* certificate = SSL_SESSION_get0_peer(const_cast<SSL_SESSION*>(session));
   return certificate != nullptr && X509_cmp_current_time(X509_get0_notAfter(certificate)) > 0;
 }
@@ -43,7 +43,7 @@ OpenSsl::OwnedSslSession SessionCache::Take(const std::string& peer, Clock::time
     return nullptr;
   }
   if (SSL_SESSION_get_protocol_version(found->session.get()) < TLS1_3_VERSION) {
-    // A copy, since connections change the session that they use.
+    // A copy, since connections modify the session that they use.
     return OpenSsl::OwnedSslSession(SSL_SESSION_dup(found->session.get()));
   }
   OpenSsl::OwnedSslSession session = std::move(found->session);

@@ -11,20 +11,20 @@
 
 namespace Tarnik::Ssl {
 
-/// TLS sessions for resumption, each under the key of the peer that it was made with. Bounded; the
-/// least recent goes first. Safe from any thread.
+/// TLS sessions for resumption, stored by peer. The number of sessions is limited; the oldest is
+/// removed first. Safe from any thread.
 class SessionCache {
  public:
   using Clock = std::chrono::steady_clock;
 
   static constexpr std::size_t kMaxSessions = 64;
   static constexpr std::size_t kMaxSessionsOfPeer = 4;
-  /// What a full handshake has found out about the peer is not relied on for longer than this.
+  /// How long the peer's verification in a full handshake is relied on.
   static constexpr std::chrono::minutes kMaxAge{60};
 
   void Put(const std::string& peer, OpenSsl::OwnedSslSession session, Clock::time_point now);
-  /// The newest session of `peer`, or null. One of TLS 1.3 is taken out: its ticket is used once,
-  /// so that observers cannot link connections (RFC 8446, appendix C.4).
+  /// The newest session of `peer`, or null. A TLS 1.3 session is removed: its ticket is used only
+  /// once, so that observers cannot link connections (RFC 8446, appendix C.4).
   OpenSsl::OwnedSslSession Take(const std::string& peer, Clock::time_point now);
 
   std::size_t Size() const;
@@ -37,7 +37,7 @@ class SessionCache {
   };
 
   mutable std::mutex mutex_;
-  std::list<Entry> entries_;  // The newest first.
+  std::list<Entry> entries_;  // the newest first
 };
 
 }  // namespace Tarnik::Ssl

@@ -20,8 +20,8 @@ constexpr const char* kTls12Ciphers =
     "!aNULL:!eNULL:!aPSK:!SRP";
 constexpr int kSecurityLevel = 2;
 
-// Each is set rather than left to its default, since OpenSSL's system-wide configuration may have
-// weakened the default.
+// Everything is set explicitly, since OpenSSL's system-wide configuration may have weakened the
+// defaults.
 bool ApplyPolicy(SSL_CTX* context) {
   SSL_CTX_set_security_level(context, kSecurityLevel);
   SSL_CTX_clear_options(context,

@@ -12,6 +12,7 @@
 
 namespace Tarnik::Ssl {
 
+/// The only implementation of `SSLContext`.
 class SSLContextImpl final : public SSLContext, public ObjectImpl {
  public:
   explicit SSLContextImpl(const SSLContextConfig& config);

@@ -11,6 +11,7 @@
 #include <utility>
 #include <vector>
 
+#include "core/copy_exception.h"
 #include "ssl/tls_engine.h"
 #include "system/host_name.h"
 
@@ -18,19 +19,16 @@ namespace Tarnik::Ssl {
 namespace {
 
 constexpr std::size_t kInputSize = 16384 + 512;
-// Data is taken from a writer, and answered to a peer, only while less than this waits to be sent.
+// While at least this many bytes wait to be sent, no data is taken from a writer and no input is
+// processed, since both may produce more output.
 constexpr std::size_t kMaxOutput = 65536;
 
 using System::GetThreadPool;
 
-std::shared_ptr<Exception> CloneOf(const Exception& error) {
-  std::unique_ptr<Throwable> clone = error.Clone();
-  return std::shared_ptr<Exception>(dynamic_cast<Exception*>(clone.release()));
-}
-
-// Operations are noted down under the mutex, and `Advance` drives all of them as far as they go: on
-// the pool's I/O threads only, after each operation that was started and each one of the stream
-// below that has ended. The stream below is used, and completions run, without the mutex.
+// Operations are recorded under the mutex, and `Advance` continues all of them as far as possible.
+// It runs only on the pool's I/O threads, after each operation that was started and each operation
+// of the stream below that ended. The mutex is not held when the stream below is used or
+// completions run.
 class SSLStreamImpl final : public SSLStream, public ObjectImpl {
  public:
   SSLStreamImpl(SSLContextImpl* context, System::Stream* stream, std::string name)
@@ -57,7 +55,7 @@ class SSLStreamImpl final : public SSLStream, public ObjectImpl {
     std::size_t size;
     WriteCompletion completion;
   };
-  /// What `Advance` does once it has released the mutex.
+  /// What `Advance` does after it has released the mutex.
   struct Steps {
     std::vector<std::function<void()>> completions;
     bool read = false;
@@ -73,7 +71,7 @@ class SSLStreamImpl final : public SSLStream, public ObjectImpl {
   void AdvanceWrite(Steps& steps);
   void FailPending(const Error& error, Steps& steps);
   void RequireInput() const;
-  Error Interpret(const Exception& error) const;
+  Error ToFailure(const Exception& error) const;
   void ReadBelow();
   void WriteBelow();
   void OnReadBelow(std::size_t bytesRead, const Exception* error);
@@ -87,24 +85,20 @@ class SSLStreamImpl final : public SSLStream, public ObjectImpl {
   std::mutex mutex_;
   std::unique_ptr<TlsEngine> engine_;
   bool closed_ = false;
-  Error failure_;       // Ends every operation from now on.
-  Error inputFailure_;  // Ends those that need more input than has come.
+  Error failure_;       // ends every operation from now on
+  Error inputFailure_;  // ends operations that need more input than has arrived
   bool inputEnded_ = false;
 
   HandshakeCompletion handshake_;
   std::optional<PendingRead> read_;
   std::optional<PendingWrite> write_;
 
-  // Used by the stream below while `readingBelow_` and `writingBelow_`, else under the mutex.
+  // Used by the stream below while `readingBelow_` or `writingBelow_` is set, else under the mutex.
   std::array<char, kInputSize> input_;
   std::vector<char> output_;
   bool readingBelow_ = false;
   bool writingBelow_ = false;
 };
-
-Exception* Get(const std::shared_ptr<Exception>& error) {
-  return error.get();
-}
 
 void SSLStreamImpl::HandshakeClientAsync(const std::string& host, const std::string& serverName,
                                          HandshakeCompletion completion) {
@@ -187,21 +181,21 @@ void SSLStreamImpl::Advance() {
     try {
       AdvanceEngine(steps);
     } catch (const Exception& error) {
-      failure_ = CloneOf(error);
+      failure_ = CopyException(error);
     }
     if (failure_ != nullptr) {
       FailPending(failure_, steps);
       steps.read = false;
     }
-    // After a failure too: an alert tells the peer about it.
+    // Also after a failure, since the output may be an alert for the peer.
     if (!closed_ && !writingBelow_ && engine_->OutputSize() > 0) {
       output_ = engine_->TakeOutput();
       steps.write = writingBelow_ = true;
     }
     steps.read = steps.read && !readingBelow_;
     readingBelow_ = readingBelow_ || steps.read;
-    // A connection that has failed is of no use: its reads must not keep it alive, should nobody
-    // close it.
+    // A failed connection is closed, since its pending read would otherwise keep it alive until
+    // somebody closes it.
     steps.close = failure_ != nullptr && !writingBelow_;
   }
   if (steps.write) {
@@ -230,7 +224,7 @@ void SSLStreamImpl::AdvanceEngine(Steps& steps) {
   }
 }
 
-// Both tell whether they need more input.
+// Like `AdvanceRead`, returns true when it needs more input.
 bool SSLStreamImpl::AdvanceHandshake(Steps& steps) {
   if (!engine_->Handshake()) {
     return true;
@@ -281,11 +275,11 @@ void SSLStreamImpl::RequireInput() const {
   }
 }
 
-// A failure of the stream below ends a handshake as a failure of the handshake, which names the
+// During the handshake a failure of the stream below becomes a handshake failure, which names the
 // peer.
-SSLStreamImpl::Error SSLStreamImpl::Interpret(const Exception& error) const {
+SSLStreamImpl::Error SSLStreamImpl::ToFailure(const Exception& error) const {
   if (!handshake_ || dynamic_cast<const CancelledException*>(&error) != nullptr) {
-    return CloneOf(error);
+    return CopyException(error);
   }
   return std::make_shared<SSLException>(engine_->HandshakeError(error.Message()));
 }
@@ -293,16 +287,16 @@ SSLStreamImpl::Error SSLStreamImpl::Interpret(const Exception& error) const {
 void SSLStreamImpl::FailPending(const Error& error, Steps& steps) {
   if (handshake_) {
     steps.completions.push_back(
-        [completion = std::exchange(handshake_, nullptr), error] { completion(Get(error)); });
+        [completion = std::exchange(handshake_, nullptr), error] { completion(error.get()); });
   }
   if (read_) {
     steps.completions.push_back(
-        [completion = std::move(read_->completion), error] { completion(0, Get(error)); });
+        [completion = std::move(read_->completion), error] { completion(0, error.get()); });
     read_.reset();
   }
   if (write_) {
     steps.completions.push_back(
-        [completion = std::move(write_->completion), error] { completion(Get(error)); });
+        [completion = std::move(write_->completion), error] { completion(error.get()); });
     write_.reset();
   }
 }
@@ -323,14 +317,14 @@ void SSLStreamImpl::OnReadBelow(std::size_t bytesRead, const Exception* error) {
     const std::lock_guard lock(mutex_);
     readingBelow_ = false;
     if (error != nullptr) {
-      inputFailure_ = Interpret(*error);
+      inputFailure_ = ToFailure(*error);
     } else if (bytesRead == 0) {
       inputEnded_ = true;
     } else if (failure_ == nullptr) {
       try {
         engine_->Feed(input_.data(), bytesRead);
       } catch (const Exception& failed) {
-        failure_ = CloneOf(failed);
+        failure_ = CopyException(failed);
       }
     }
   }
@@ -351,7 +345,7 @@ void SSLStreamImpl::OnWrittenBelow(const Exception* error) {
     const std::lock_guard lock(mutex_);
     writingBelow_ = false;
     if (error != nullptr && failure_ == nullptr) {
-      failure_ = Interpret(*error);
+      failure_ = ToFailure(*error);
     }
   }
   Advance();

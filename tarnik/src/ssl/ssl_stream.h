@@ -9,7 +9,7 @@
 
 namespace Tarnik::Ssl {
 
-/// TLS by `context` over `stream`; `name` is a label for diagnostics.
+/// A TLS stream of `context` over `stream`; `name` is a label for diagnostics.
 Ref<SSLStream> CreateSSLStream(SSLContextImpl* context, System::Stream* stream,
                                const std::string& name);
 

@@ -1,9 +1,9 @@
 #include "ssl/tls_engine.h"
 
 #include <openssl/err.h>
+#include <tarnik/text/string_util.h>
 
 #include <algorithm>
-#include <cctype>
 #include <climits>
 #include <utility>
 
@@ -16,13 +16,7 @@ int ToInt(std::size_t size) {
   return static_cast<int>(std::min(size, static_cast<std::size_t>(INT_MAX)));
 }
 
-std::string ToLower(std::string text) {
-  std::transform(text.begin(), text.end(), text.begin(),
-                 [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
-  return text;
-}
-
-// The earliest error is the cause of those after it.
+// The earliest error is the cause of the later ones.
 std::string TakeReason() {
   const unsigned long error = ERR_peek_error();
   const char* reason = ERR_reason_error_string(error);
@@ -41,7 +35,7 @@ TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
                      const std::string& serverName)
     : context_(std::move(context)),
       host_(host),
-      sessionPeer_(ToLower(host) + '\n' + ToLower(serverName)),
+      sessionPeer_(StringUtil::ToLower(host) + '\n' + StringUtil::ToLower(serverName)),
       check_(serverName.empty() ? host : serverName, context_->Pinned()),
       ssl_(SSL_new(context_->Get())) {
   const OpenSsl::ErrorScope errors;
@@ -62,8 +56,8 @@ TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
 
 TlsEngine::~TlsEngine() {
   if (isHandshakeDone_ && !hasFailed_) {
-    // OpenSSL takes a session for spoilt whose connection was not shut down. This one did not fail,
-    // it was merely closed without farewell.
+    // OpenSSL does not resume the session of a connection that was not shut down. This one did not
+    // fail; it was only closed without close_notify.
     SSL_set_shutdown(ssl_.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
   }
 }
@@ -166,19 +160,19 @@ int TlsEngine::OnVerified(int isValid, X509_STORE_CTX* context) {
   try {
     return EngineOf(ssl)->check_.OnVerified(isValid == 1, context) ? 1 : 0;
   } catch (...) {
-    return 0;  // Nothing may be thrown through OpenSSL.
+    return 0;  // no exception may pass through OpenSSL
   }
 }
 
 int TlsEngine::OnNewSession(SSL* ssl, SSL_SESSION* session) {
-  // Owning it already, so that it is freed also when it cannot be kept.
+  // Owned from the start, so that it is freed when it cannot be kept.
   OpenSsl::OwnedSslSession owned(session);
   TlsEngine* engine = EngineOf(ssl);
   try {
     engine->context_->Sessions().Put(engine->sessionPeer_, std::move(owned),
                                      SessionCache::Clock::now());
   } catch (...) {
-    return 1;  // Nothing may be thrown through OpenSSL; the session is merely not resumed.
+    return 1;  // no exception may pass through OpenSSL; the session is just not resumed
   }
   return 1;
 }

@@ -14,8 +14,8 @@
 namespace Tarnik::Ssl {
 
 /// The client's side of one TLS connection without its I/O: bytes from the peer go in, bytes for
-/// the peer come out. Failures are `SSLException`s; after one, nothing but `TakeOutput` may be
-/// called. Used by one thread at a time, with OpenSSL's error queue of that thread to itself.
+/// the peer come out. Failures are `SSLException`s; after one, only `TakeOutput` may be called.
+/// Used by one thread at a time; clears OpenSSL's error queue of that thread.
 class TlsEngine {
  public:
   /// The peer must be `serverName`, or `host` if that is empty.
@@ -24,20 +24,21 @@ class TlsEngine {
   TlsEngine(const TlsEngine&) = delete;
   TlsEngine& operator=(const TlsEngine&) = delete;
 
-  /// Goes on with the handshake; true when it has ended well, false when it needs more input.
+  /// Continues the handshake; true when it has succeeded, false when it needs more input.
   bool Handshake();
-  /// Reads 1 to `size` bytes of data; 0 at the peer's close_notify; nothing when it needs more
-  /// input.
+  /// Reads 1 to `size` bytes of data. Returns 0 at the peer's close_notify, and nothing when it
+  /// needs more input.
   std::optional<std::size_t> Read(char* buffer, std::size_t size);
   /// Takes 1 to `size` bytes of data to send and returns how many.
   std::size_t Write(const char* data, std::size_t size);
 
   void Feed(const char* data, std::size_t size);
   std::size_t OutputSize() const;
-  /// Hands over all output that there is.
+  /// Moves all pending output out.
   std::vector<char> TakeOutput();
 
-  /// Fails as a handshake or, after it, as a connection that was cut off without close_notify.
+  /// Throws the failure of the handshake or, after it, of a connection that was cut off without
+  /// close_notify.
   [[noreturn]] void FailAtEndOfInput() const;
   SSLException HandshakeError(const std::string& cause) const;
   bool IsHandshakeDone() const noexcept { return isHandshakeDone_; }
@@ -56,8 +57,8 @@ class TlsEngine {
   const std::string sessionPeer_;
   PeerCheck check_;
   OpenSsl::OwnedSsl ssl_;
-  BIO* input_ = nullptr;   // Owned by `ssl_`.
-  BIO* output_ = nullptr;  // Owned by `ssl_`.
+  BIO* input_ = nullptr;   // owned by `ssl_`
+  BIO* output_ = nullptr;  // owned by `ssl_`
   bool isHandshakeDone_ = false;
   bool hasFailed_ = false;
 };

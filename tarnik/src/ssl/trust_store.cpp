@@ -9,13 +9,13 @@
 #include <string>
 #include <system_error>
 
+#include "ssl/decode_certificate.h"
 #include "support/openssl_error.h"
 
 namespace Tarnik::Ssl {
 namespace {
 
-// OpenSSL reports an unreadable file in other words than the system, and a missing folder not at
-// all.
+// OpenSSL does not report why a file is unreadable, nor that a folder is missing.
 void RequireReadable(const std::string& path, int mode, const std::string& what) {
   if (path.empty() || path.find('\0') != std::string::npos) {
     throw SSLException(what + " '': the path is empty or holds a NUL.");
@@ -56,16 +56,14 @@ void AddCaCertificate(X509_STORE* store, const Crypto::Certificate* certificate)
     throw InvalidArgumentException("A CA certificate of the SSL context is null.");
   }
   const OpenSsl::ErrorScope errors;
-  const unsigned char* bytes = certificate->DerBytes();
-  const OpenSsl::OwnedCertificate decoded(
-      d2i_X509(nullptr, &bytes, static_cast<long>(certificate->DerLength())));
+  const OpenSsl::OwnedCertificate decoded = DecodeCertificate(*certificate);
   if (decoded == nullptr || X509_STORE_add_cert(store, decoded.get()) != 1) {
     throw SSLException(
         errors.Describe("Cannot trust the CA certificate " + certificate->SubjectName()));
   }
 }
 
-// By OpenSSL's compiled-in paths rather than its defaults, which look into the environment.
+// Uses the compiled-in paths, since OpenSSL's function for its defaults also reads the environment.
 void LoadSystemStore(X509_STORE* store) {
   const std::string file = X509_get_default_cert_file();
   const std::string folder = X509_get_default_cert_dir();

@@ -15,7 +15,7 @@
 
 namespace Tarnik::OpenSsl {
 
-/// Frees with one function of OpenSSL.
+/// Frees an object with the OpenSSL function `Function`.
 template <auto Function>
 struct Free {
   template <class T>
@@ -52,7 +52,7 @@ using OwnedEcdsaSignature = Owned<ECDSA_SIG, ECDSA_SIG_free>;
 using OwnedGeneralNames = std::unique_ptr<GENERAL_NAMES, FreeGeneralNames>;
 using OwnedKey = Owned<EVP_PKEY, EVP_PKEY_free>;
 using OwnedKeyContext = Owned<EVP_PKEY_CTX, EVP_PKEY_CTX_free>;
-/// Its memory is cleansed.
+/// OpenSSL cleanses the memory of the key.
 using OwnedKeyInfo = Owned<PKCS8_PRIV_KEY_INFO, PKCS8_PRIV_KEY_INFO_free>;
 using OwnedPkcs12 = Owned<PKCS12, PKCS12_free>;
 using OwnedSsl = Owned<SSL, SSL_free>;
@@ -61,7 +61,7 @@ using OwnedSslSession = Owned<SSL_SESSION, SSL_SESSION_free>;
 using OwnedStore = Owned<OSSL_STORE_CTX, OSSL_STORE_close>;
 using OwnedStoreInfo = Owned<OSSL_STORE_INFO, OSSL_STORE_INFO_free>;
 using OwnedTrustStore = Owned<X509_STORE, X509_STORE_free>;
-/// Text or bytes that OpenSSL has allocated.
+/// Text or bytes that OpenSSL allocated.
 template <class T>
 using OwnedMemory = std::unique_ptr<T, FreeMemory>;
 

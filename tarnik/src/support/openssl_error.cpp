@@ -12,7 +12,8 @@ ErrorScope::ErrorScope() noexcept {
   ERR_set_mark();
 }
 
-// Without a mark (an empty queue cannot be marked) this empties the queue, which is the same thing.
+// An empty queue cannot be marked. Without a mark ERR_pop_to_mark empties the queue, which restores
+// it as well.
 ErrorScope::~ErrorScope() {
   ERR_pop_to_mark();
 }

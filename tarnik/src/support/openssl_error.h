@@ -6,8 +6,8 @@
 
 namespace Tarnik::OpenSsl {
 
-/// Keeps this thread's OpenSSL error queue as it was found: errors raised while the scope lives are
-/// gone afterwards, those of the host program stay.
+/// Restores this thread's OpenSSL error queue: errors raised within the scope are removed at its
+/// end, and errors of the host program stay.
 class ErrorScope {
  public:
   ErrorScope() noexcept;
@@ -15,8 +15,8 @@ class ErrorScope {
   ErrorScope(const ErrorScope&) = delete;
   ErrorScope& operator=(const ErrorScope&) = delete;
 
-  /// `what` followed by ": " and the reason of the latest error, if OpenSSL gave one, and a full
-  /// stop.
+  /// `what`, then ": " and the reason of the latest error within the scope, if there is one, and a
+  /// full stop.
   std::string Describe(std::string_view what) const;
 
  private:

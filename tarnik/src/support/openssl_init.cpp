@@ -5,7 +5,7 @@
 namespace Tarnik::OpenSsl {
 namespace {
 
-// A failure here is no loss: OpenSSL then initialises itself on first use.
+// A failure is harmless: OpenSSL then initialises itself on first use.
 [[maybe_unused]] const bool kInitialisedAtLoad = (Initialise(), true);
 
 }  // namespace

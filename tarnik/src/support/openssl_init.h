@@ -3,8 +3,8 @@
 
 namespace Tarnik::OpenSsl {
 
-/// Initialises OpenSSL without its clean-up at process exit: worker threads may still be inside it
-/// when the process ends. Runs when the library is loaded; later calls do nothing.
+/// Initialises OpenSSL without its clean-up at process exit, since worker threads may still use it
+/// then. Runs when the library is loaded; later calls do nothing.
 void Initialise() noexcept;
 
 }  // namespace Tarnik::OpenSsl

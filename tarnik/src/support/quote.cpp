@@ -18,4 +18,8 @@ std::string Quote(std::string_view text) {
   return quoted.append(cut ? "...'" : "'");
 }
 
+std::string QuoteVerbatim(std::string_view text) {
+  return "'" + std::string(text) + "'";
+}
+
 }  // namespace Tarnik

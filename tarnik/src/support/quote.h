@@ -6,9 +6,12 @@
 
 namespace Tarnik {
 
-/// `text` from outside in the form for a message: between apostrophes, what is not printable ASCII
-/// replaced with question marks, and cut after 120 bytes.
+/// `text` of a peer in the form for a message: between apostrophes, cut after 120 bytes, and with
+/// question marks in place of bytes that are not printable ASCII.
 std::string Quote(std::string_view text);
+
+/// `text` between apostrophes, unchanged. For names whose characters have been checked.
+std::string QuoteVerbatim(std::string_view text);
 
 }  // namespace Tarnik
 

@@ -5,12 +5,12 @@
 #include <string>
 #include <string_view>
 
-#include <tarnik/text/string_util.h>
+#include "support/cleanse.h"
 
 namespace Tarnik {
 
-/// Bytes that may hold passwords, keys or tokens: no copy is left behind in memory, neither when
-/// the text dies nor when it outgrows its buffer.
+/// Bytes that may hold passwords, keys or tokens. No copy stays in memory when the text is
+/// destroyed or outgrows its buffer.
 class SensitiveText {
  public:
   SensitiveText() = default;
@@ -26,7 +26,7 @@ class SensitiveText {
     larger.reserve(capacity);
     larger.assign(text_);
     text_.swap(larger);
-    StringUtil::Cleanse(larger);
+    CleanseBuffer(larger);
   }
 
   void Append(std::string_view more) {
@@ -47,15 +47,16 @@ class SensitiveText {
     }
     std::string rest(text_, count);
     text_.swap(rest);
-    StringUtil::Cleanse(rest);
+    CleanseBuffer(rest);
   }
 
-  void Clear() noexcept { StringUtil::Cleanse(text_); }
+  void Clear() noexcept { CleanseBuffer(text_); }
 
-  /// Hands the bytes over to an owner who cleanses them.
+  /// Moves the bytes to the caller, who must cleanse them.
   std::string Take() noexcept {
     std::string taken;
     taken.swap(text_);
+    Clear();  // a short text was copied out of the string object
     return taken;
   }
 

@@ -3,6 +3,8 @@
 #include <tarnik/core/exception.h>
 #include <tarnik/system/date_time.h>
 
+#include "support/ascii.h"
+
 namespace Tarnik::System {
 namespace {
 
@@ -13,7 +15,7 @@ constexpr int kMaxBiasMinutes = 14 * 60;
   throw DateTimeFormatException(std::string("Not a date and time: ") + reason);
 }
 
-// Walks a text from front to back; anything unexpected is an error.
+// Reads a text from front to back; unexpected characters are errors.
 class Scanner {
  public:
   explicit Scanner(std::string_view text) : rest_(text) {}
@@ -31,7 +33,7 @@ class Scanner {
       Refuse(reason);
     }
   }
-  bool IsAtDigit() const { return !rest_.empty() && rest_.front() >= '0' && rest_.front() <= '9'; }
+  bool IsAtDigit() const { return !rest_.empty() && IsDigit(rest_.front()); }
   int Digit(const char* reason) {
     if (!IsAtDigit()) {
       Refuse(reason);

@@ -14,13 +14,14 @@ struct SocketAddress {
   socklen_t length;
 };
 
-/// What a look-up has found: addresses in the order in which to try them, or why there are none.
+/// The result of a look-up: addresses in the order in which to try them, or the reason for their
+/// absence.
 struct HostAddresses {
   std::vector<SocketAddress> addresses;
   std::string error;
 };
 
-/// Asks the system's resolver; blocks unless `host` is an address literal.
+/// Calls the system's resolver; blocks unless `host` is an address literal.
 HostAddresses LookUpHost(const std::string& host, int port);
 
 }  // namespace Tarnik::System

@@ -5,14 +5,48 @@
 
 #include <algorithm>
 
+#include "support/ascii.h"
+
 namespace Tarnik::System {
 namespace {
 
-constexpr std::size_t kMaxHostLength = 253;
+constexpr std::size_t kMaxNameLength = 253;
+constexpr std::size_t kMaxLabelLength = 63;
 
 bool IsAllowed(char character) {
   return character > ' ' && character < '\x7f' &&
          std::string_view("[]/\\@\"<>").find(character) == std::string_view::npos;
+}
+
+bool IsAddress(int family, std::string_view host) noexcept {
+  if (host.empty() || host.size() >= INET6_ADDRSTRLEN ||
+      host.find('\0') != std::string_view::npos) {
+    return false;
+  }
+  char text[INET6_ADDRSTRLEN] = {};
+  std::copy(host.begin(), host.end(), text);
+  in6_addr address;
+  return inet_pton(family, text, &address) == 1;
+}
+
+bool IsLabel(std::string_view label) noexcept {
+  if (label.empty() || label.size() > kMaxLabelLength) {
+    return false;
+  }
+  if (label.front() == '-' || label.back() == '-') {
+    return false;
+  }
+  return std::all_of(label.begin(), label.end(),
+                     [](char c) { return IsDigit(c) || IsLetter(c) || c == '-' || c == '_'; });
+}
+
+bool IsNumber(std::string_view label) noexcept {
+  if (AreDigits(label)) {
+    return true;
+  }
+  const bool hasHexPrefix =
+      label.size() >= 2 && label[0] == '0' && (label[1] == 'x' || label[1] == 'X');
+  return hasHexPrefix && std::all_of(label.begin() + 2, label.end(), IsHexDigit);
 }
 
 }  // namespace
@@ -21,7 +55,7 @@ void RequireHostName(std::string_view host) {
   if (host.empty()) {
     throw InvalidArgumentException("The host name is empty.");
   }
-  if (host.size() > kMaxHostLength) {
+  if (host.size() > kMaxNameLength) {
     throw InvalidArgumentException("The host name is longer than 253 characters.");
   }
   if (host.front() == '.') {
@@ -32,15 +66,42 @@ void RequireHostName(std::string_view host) {
   }
 }
 
-bool IsAddressLiteral(const std::string& host) {
-  unsigned char address[sizeof(in6_addr)];
-  return inet_pton(AF_INET, host.c_str(), address) == 1 ||
-         inet_pton(AF_INET6, host.substr(0, host.find('%')).c_str(), address) == 1;
+bool IsIPv4Address(std::string_view host) noexcept {
+  return IsAddress(AF_INET, host);
+}
+
+bool IsIPv6Address(std::string_view host) noexcept {
+  return IsAddress(AF_INET6, host);
+}
+
+bool IsAddressLiteral(std::string_view host) noexcept {
+  return IsIPv4Address(host) || IsIPv6Address(host.substr(0, host.find('%')));
+}
+
+bool IsDnsName(std::string_view host) noexcept {
+  if (host.empty() || host.size() > kMaxNameLength) {
+    return false;
+  }
+  while (true) {
+    const auto dot = host.find('.');
+    const std::string_view label = host.substr(0, dot);
+    if (!IsLabel(label)) {
+      return false;
+    }
+    if (dot == std::string_view::npos) {
+      return !IsNumber(label);
+    }
+    host.remove_prefix(dot + 1);
+  }
+}
+
+std::string BracketIPv6(const std::string& host) {
+  const bool isIPv6 = host.find(':') != std::string::npos;
+  return isIPv6 ? "[" + host + "]" : host;
 }
 
 std::string DescribeEndpoint(const std::string& host, int port) {
-  const bool needsBrackets = host.find(':') != std::string::npos;
-  return (needsBrackets ? "[" + host + "]" : host) + ":" + std::to_string(port);
+  return BracketIPv6(host) + ":" + std::to_string(port);
 }
 
 }  // namespace Tarnik::System

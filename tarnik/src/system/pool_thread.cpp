@@ -10,7 +10,7 @@
 namespace Tarnik::System {
 namespace {
 
-// A new thread inherits its creator's signal mask.
+// Blocks signals while a thread is created, since a new thread inherits its creator's signal mask.
 class SignalBlock {
  public:
   SignalBlock() {

@@ -5,9 +5,9 @@
 
 namespace Tarnik::System {
 
-/// Starts a detached thread that shows as `name` (at most 15 characters) in debuggers. The host's
-/// signal handlers never run on it: all signals are blocked but those that a thread raises itself.
-/// Throws `std::system_error` when the system has no thread to give.
+/// Starts a detached thread that debuggers show as `name` (at most 15 characters). The host
+/// program's signal handlers never run on it: all signals are blocked except those that a thread
+/// raises itself. Throws `std::system_error` when the system cannot create a thread.
 void StartPoolThread(const char* name, std::function<void()> body);
 
 /// Stops the calling thread until the process ends.

@@ -18,10 +18,10 @@ namespace {
 using boost::asio::ip::tcp;
 using boost::system::error_code;
 
-// Every call on the socket is made with the mutex held, every completion runs without it. An
-// operation that has begun on the socket ends through its own handler, since the caller's buffer is
-// in use until then; the handler looks at `closed_` first. Only a connect that still waits for its
-// look-up is ended by `Close` itself.
+// The socket is called with the mutex held; completions run without it. An operation that has
+// started on the socket is ended by its own handler, since the caller's buffer is in use until
+// then; the handler checks `closed_` first. `Close` itself ends only a connect that still waits for
+// its look-up.
 class TCPClientSocketImpl final : public TCPClientSocket, public ObjectImpl {
  public:
   explicit TCPClientSocketImpl(ThreadPoolImpl& pool)
@@ -56,11 +56,11 @@ class TCPClientSocketImpl final : public TCPClientSocket, public ObjectImpl {
   const Ref<ThreadPoolImpl> pool_;
   mutable std::mutex mutex_;
   tcp::socket socket_;
-  std::string peer_;  // Written once, by ConnectAsync.
+  std::string peer_;  // set once, by ConnectAsync
   Phase phase_ = Phase::kNew;
   bool closed_ = false;
   ConnectCompletion connectCompletion_;
-  std::vector<SocketAddress> addresses_;  // Those not tried yet, the next one last.
+  std::vector<SocketAddress> addresses_;  // those not tried yet, the next one last
   bool reading_ = false;
   bool writing_ = false;
   const char* unwritten_ = nullptr;
@@ -68,7 +68,8 @@ class TCPClientSocketImpl final : public TCPClientSocket, public ObjectImpl {
   WriteCompletion writeCompletion_;
 };
 
-// An address that this host has no way to reach says less than why another one failed.
+// These errors only say that this host cannot use the address; the failure of another address is
+// reported instead, if there is one.
 bool IsUnusableAddress(const error_code& error) {
   namespace Error = boost::asio::error;
   return error == Error::network_unreachable || error == Error::address_family_not_supported ||
@@ -96,7 +97,7 @@ void TCPClientSocketImpl::ConnectAsync(const std::string& host, int port,
   {
     const std::lock_guard lock(mutex_);
     if (phase_ != Phase::kNew) {
-      throw InvalidStateException("The socket was told to connect before.");
+      throw InvalidStateException("The socket was already asked to connect.");
     }
     phase_ = Phase::kLookingUp;
     peer_ = DescribeEndpoint(host, port);
@@ -120,7 +121,7 @@ void TCPClientSocketImpl::OnLookedUp(const HostAddresses& found) {
   {
     const std::lock_guard lock(mutex_);
     if (phase_ != Phase::kLookingUp) {
-      return;  // Close has ended the connect.
+      return;  // ended by Close
     }
     phase_ = Phase::kConnecting;
     addresses_.assign(found.addresses.rbegin(), found.addresses.rend());
@@ -165,8 +166,8 @@ void TCPClientSocketImpl::OnConnected(const error_code& error, const std::string
     EndConnect(nullptr);
     return;
   }
-  const bool saysLess = IsUnusableAddress(error) && !previousCause.empty();
-  TryNextAddress(saysLess ? previousCause : error.message());
+  const bool keepsPrevious = IsUnusableAddress(error) && !previousCause.empty();
+  TryNextAddress(keepsPrevious ? previousCause : error.message());
 }
 
 void TCPClientSocketImpl::EndConnect(Exception* error) {

@@ -20,7 +20,7 @@ constexpr std::size_t kIoThreads = 2;
 constexpr std::size_t kMaxLookups = 16;
 constexpr std::chrono::seconds kIdleLimit{10};
 constexpr std::chrono::milliseconds kExitLimit{200};
-// Longer delays are cut to this, which the clock can hold: 30 years.
+// Longer delays are cut to 30 years, which the clock can represent.
 constexpr unsigned long kMaxDelay = 30UL * 365 * 24 * 3600 * 1000000;
 
 thread_local bool isIoThread = false;
@@ -41,7 +41,7 @@ class Timer final : public CancellableItem, public ObjectImpl {
   }
 
   bool Cancel() override {
-    // Destroyed after the lock is released: what the completion holds may call back.
+    // Destroyed after the lock is released, since destructors of its captures may call `Cancel`.
     const std::function<void()> dropped = TakeCompletion();
     const std::lock_guard lock(mutex_);
     timer_.cancel();
@@ -67,16 +67,17 @@ void RequireCallable(const std::function<void()>& function) {
   }
 }
 
-// The pool is never destroyed: its threads use it until the process is gone.
+// The pool is never destroyed, since its threads use it until the process ends.
 ThreadPoolImpl& ThePool() {
   static ThreadPoolImpl* const pool = [] {
-    // Before the exit handler below, so that this handler runs before what OpenSSL may register.
+    // Before the exit handler below is registered, so that it runs before those that OpenSSL
+    // registers.
     OpenSsl::Initialise();
     auto* created = new ThreadPoolImpl();
     created->IncRef();
     return created;
   }();
-  // Registered once the pool stands, since the handler asks for it.
+  // Registered after the pool was created, since the handler uses it.
   static const int registered = std::atexit([] { ThePool().Freeze(); });
   if (registered != 0) {
     throw std::bad_alloc();

@@ -17,6 +17,7 @@ class io_context;
 
 namespace Tarnik::System {
 
+/// The only implementation of `ThreadPool`.
 class ThreadPoolImpl final : public ThreadPool, public ObjectImpl {
  public:
   ThreadPoolImpl();
@@ -30,12 +31,12 @@ class ThreadPoolImpl final : public ThreadPool, public ObjectImpl {
 
   boost::asio::io_context& IoContext() noexcept { return *ioContext_; }
 
-  /// Runs `lookup`, which may block but waits for nothing that the pool does. Name look-ups have
-  /// threads of their own, so that work items which fill the pool and wait for connections cannot
-  /// keep those connections from being made.
+  /// Runs `lookup`, which may block but must not wait for other work of the pool. Name look-ups
+  /// have separate threads, so that work items which occupy all workers and wait for connections
+  /// cannot prevent these connections from being made.
   void RunLookup(std::function<void()> lookup);
 
-  /// Stops everything for process exit: see `GetThreadPool`.
+  /// Stops everything for process exit, as `ThreadPool` describes.
   void Freeze();
 
  private:
@@ -51,7 +52,8 @@ class ThreadPoolImpl final : public ThreadPool, public ObjectImpl {
   std::size_t ioThreads_ = 0;
 };
 
-/// `pool` as what `GetThreadPool` returned. Throws `InvalidArgumentException` when it is another.
+/// The implementation of `pool`. Throws `InvalidArgumentException` unless `GetThreadPool` returned
+/// it.
 ThreadPoolImpl& ToThreadPoolImpl(ThreadPool* pool);
 
 }  // namespace Tarnik::System

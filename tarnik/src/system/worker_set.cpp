@@ -29,8 +29,8 @@ void WorkerSet::Run(std::function<void()> item) {
   if (phase_ != Phase::kRunning) {
     return;
   }
-  // Idle workers that were woken before but have not taken their item yet still count as idle, and
-  // their items still count as waiting.
+  // Idle workers that were woken but have not taken their item yet still count as idle, and their
+  // items as waiting.
   if (items_.size() <= idle_ || workers_ == maxWorkers_) {
     itemsOrEnd_.notify_one();
     return;
@@ -38,7 +38,7 @@ void WorkerSet::Run(std::function<void()> item) {
   try {
     StartWorker();
   } catch (const std::system_error&) {
-    // With a worker left the item runs later; without one nobody would ever run it.
+    // With another worker the item runs later; without one it would never run.
     if (workers_ == 0) {
       items_.pop_back();
       throw;
@@ -74,7 +74,8 @@ void WorkerSet::WorkerLoop() {
     item = nullptr;
     lock.lock();
   }
-  // Nothing of this object may be touched once the lock is released: the destructor waits for it.
+  // This object must not be used after the lock is released: the destructor waits only until no
+  // worker is left.
   --workers_;
   workerChanged_.notify_all();
 }
@@ -85,8 +86,8 @@ bool WorkerSet::WaitForItem(std::unique_lock<std::mutex>& lock, std::function<vo
   if (phase_ == Phase::kFrozen) {
     workerChanged_.notify_all();
   }
-  const auto isAwaited = [this] { return phase_ == Phase::kEnding || !items_.empty(); };
-  while (phase_ == Phase::kFrozen || !isAwaited()) {
+  const auto hasReason = [this] { return phase_ == Phase::kEnding || !items_.empty(); };
+  while (phase_ == Phase::kFrozen || !hasReason()) {
     if (phase_ == Phase::kFrozen) {
       lock.unlock();
       ParkThread();

@@ -10,22 +10,22 @@
 
 namespace Tarnik::System {
 
-/// Threads that run items which may block. Grows while all are busy, up to a maximum; items past it
-/// queue in order. Threads idle for `idleLimit` end. Safe from any thread.
+/// Threads that run items which may block. A thread is added while all are busy, up to a maximum;
+/// further items queue in order. Threads that are idle for `idleLimit` end. Safe from any thread.
 ///
-/// A set that lives as long as the process must be leaked: its threads are detached and use it.
+/// A set that lives as long as the process must be leaked, since its detached threads use it.
 class WorkerSet {
  public:
   WorkerSet(const char* threadName, std::size_t maxWorkers, std::chrono::milliseconds idleLimit);
-  /// Waits for the items under way; those not started are dropped.
+  /// Waits for the items under way; items that have not started are dropped.
   ~WorkerSet();
   WorkerSet(const WorkerSet&) = delete;
   WorkerSet& operator=(const WorkerSet&) = delete;
 
   void Run(std::function<void()> item);
 
-  /// From now on nothing is started; threads that end an item stop where they are for good. Waits
-  /// at most `limit` for items that are under way on other threads. For process exit.
+  /// For process exit: from now on no item is started, and a thread that has finished an item stops
+  /// for good. Waits at most `limit` for items that are under way on other threads.
   void Freeze(std::chrono::milliseconds limit);
 
   std::size_t WorkerCount() const;

@@ -12,7 +12,7 @@
 namespace Tarnik {
 namespace {
 
-// OpenSSL counts in int: longer inputs go in pieces that end on a whole group.
+// OpenSSL takes lengths as int, so long inputs are encoded in pieces of whole groups.
 constexpr std::size_t kPieceBytes = std::size_t{3} << 20;
 constexpr std::size_t kMaxGroups = std::numeric_limits<std::size_t>::max() / 4;
 
@@ -45,7 +45,8 @@ void Base64_Encode(const unsigned char* data, std::size_t length, char* buffer,
   if (length == 0) {
     return;
   }
-  // OpenSSL appends a NUL: the last group, behind which there may be no room, goes a detour.
+  // OpenSSL appends a NUL, for which the buffer may have no room: the last group is encoded into
+  // another buffer.
   const std::size_t head = (length - 1) / 3 * 3;
   for (std::size_t from = 0; from < head; from += kPieceBytes) {
     buffer += EncodeBlock(data + from, std::min(kPieceBytes, head - from), buffer);

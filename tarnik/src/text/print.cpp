@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <cstdio>
 
+#include "support/ascii.h"
+
 namespace Tarnik {
 namespace {
 
@@ -24,15 +26,15 @@ std::string DateText(const System::DateTime& time) {
   return {text, static_cast<std::size_t>(length)};
 }
 
-// Reads the decimal number at the front of `text`; its length is 0 when there is none.
 struct Placeholder {
   std::size_t number = 0;
   std::size_t length = 0;
 };
 
+// Reads the number of an argument at the front of `text`; the number is 0 when there is none.
 Placeholder ReadPlaceholder(std::string_view text, std::size_t argumentCount) {
   Placeholder result;
-  while (result.length < text.size() && text[result.length] >= '0' && text[result.length] <= '9') {
+  while (result.length < text.size() && IsDigit(text[result.length])) {
     const std::size_t number =
         result.number * 10 + static_cast<std::size_t>(text[result.length] - '0');
     if (number > argumentCount) {

@@ -7,15 +7,17 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
-#include <cstring>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/text/base64.h>
 
+#include "support/ascii.h"
+#include "support/cleanse.h"
+
 namespace Tarnik::StringUtil {
 namespace {
 
-// OpenSSL counts in int: longer inputs go in pieces that end on a whole group.
+// OpenSSL takes lengths as int, so long inputs are decoded in pieces of whole groups.
 constexpr std::size_t kDecodePiece = std::size_t{4} << 20;
 constexpr std::string_view kAlphabet =
     "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
@@ -48,11 +50,12 @@ struct CompactText {
 CompactText Compact(std::string_view text) {
   CompactText result;
   result.text.resize(text.size());
-  // Locals, since a character that is written could alias the members.
+  // Locals, since the compiler must assume that a written character changes the members.
   char* const start = result.text.data();
   char* end = start;
   std::size_t symbols = 0;
-  // Each character is written, and the next one over it if it is white space: no branch to miss.
+  // Each character is written, and white space is overwritten by the next one, which needs no
+  // branch.
   for (const char character : text) {
     const CharacterClass kind = kClasses[static_cast<unsigned char>(character)];
     *end = character;
@@ -72,7 +75,7 @@ std::size_t CountPadding(std::string_view text) {
   return count;
 }
 
-// The bits behind the last byte must be zero (RFC 4648, section 3.5).
+// The bits after the last byte must be zero (RFC 4648, section 3.5).
 bool HasZeroTail(std::string_view symbols, std::size_t padding) {
   if (padding == 0) {
     return true;
@@ -130,25 +133,16 @@ std::string GenerateUuid() {
 
 std::string ToLower(std::string_view text) {
   std::string result(text);
-  for (char& c : result) {
-    if (c >= 'A' && c <= 'Z') {
-      c = static_cast<char>(c - 'A' + 'a');
-    }
-  }
+  std::transform(result.begin(), result.end(), result.begin(), ToLowerAscii);
   return result;
 }
 
 void Cleanse(std::string& text) noexcept {
-  explicit_bzero(text.data(), text.capacity());
-  text.clear();
+  CleanseBuffer(text);
 }
 
 void Cleanse(std::vector<unsigned char>& bytes) noexcept {
-  if (bytes.capacity() != 0) {  // an empty one may have no bytes at all
-    bytes.resize(bytes.capacity());
-    explicit_bzero(bytes.data(), bytes.size());
-  }
-  bytes.clear();
+  CleanseBuffer(bytes);
 }
 
 }  // namespace Tarnik::StringUtil

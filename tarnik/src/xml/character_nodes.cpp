@@ -3,6 +3,7 @@
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/element_node.h>
 
+#include "support/quote.h"
 #include "xml/tree_builder.h"
 #include "xml/xml_chars.h"
 
@@ -12,7 +13,7 @@ void TextNode::SetText(std::string_view text) {
   if (!IsXmlText(text)) {
     const ElementNode* parent = ParentElement();
     const std::string place =
-        parent == nullptr ? "" : " of element '" + std::string(parent->QualifiedNameText()) + "'";
+        parent == nullptr ? "" : " of element " + QuoteVerbatim(parent->QualifiedNameText());
     throw InvalidArgumentException("The text" + place +
                                    " holds what XML cannot carry: a control character or bytes "
                                    "that are not UTF-8.");

@@ -10,6 +10,7 @@
 #include <tarnik/xml/xml_parse_exception.h>
 #include <tarnik/xml/xml_parser.h>
 
+#include "support/quote.h"
 #include "xml/name_cache.h"
 #include "xml/namespace_scope.h"
 #include "xml/namespaces.h"
@@ -19,10 +20,6 @@
 namespace Tarnik::Xml {
 
 namespace {
-
-std::string Quoted(std::string_view name) {
-  return "'" + std::string(name) + "'";
-}
 
 class DocumentHandler final : public XMLHandler, public ObjectImpl {
  public:
@@ -178,7 +175,7 @@ void DocumentHandler::ProcessingInstruction(const Position& position, std::strin
   // Namespaces in XML 1.0, section 7: no processing instruction target holds a colon.
   if (target.find(':') != std::string_view::npos) {
     throw XMLParseException(
-        "The processing instruction target " + Quoted(target) + " holds a colon", position);
+        "The processing instruction target " + QuoteVerbatim(target) + " holds a colon", position);
   }
   FlushText();
   Add(TreeBuilder::NewProcessingInstruction(*tree_, target, text), position);
@@ -198,7 +195,8 @@ const InternedName* DocumentHandler::Intern(std::string_view name, const Positio
     return slot;
   }
   if (name.find(':') != std::string_view::npos && !IsQualifiedName(name)) {
-    throw XMLParseException("The name " + Quoted(name) + " is not a qualified name", position);
+    throw XMLParseException("The name " + QuoteVerbatim(name) + " is not a qualified name",
+                            position);
   }
   slot = tree_->StoreName(name);
   return slot;
@@ -214,11 +212,11 @@ void DocumentHandler::Declare(const InternedName& name, std::string_view uri,
                             position);
   }
   if ((prefix == "xml") != (uri == kXmlNamespace)) {
-    throw XMLParseException("The prefix 'xml' and its namespace belong to each other alone",
+    throw XMLParseException("The prefix 'xml' and its namespace belong only to each other",
                             position);
   }
   if (uri.empty() && !prefix.empty()) {
-    throw XMLParseException("The prefix " + Quoted(prefix) + " is declared as no namespace",
+    throw XMLParseException("The prefix " + QuoteVerbatim(prefix) + " is declared as no namespace",
                             position);
   }
   scope_.Push({prefix, uri, {}, depth_});
@@ -233,14 +231,14 @@ std::string_view DocumentHandler::Resolve(std::string_view prefix, const Positio
     return binding->uri;
   }
   if (!prefix.empty()) {
-    throw XMLParseException("The prefix " + Quoted(prefix) + " is not bound to a namespace",
+    throw XMLParseException("The prefix " + QuoteVerbatim(prefix) + " is not bound to a namespace",
                             position);
   }
   return {};
 }
 
-// Namespaces in XML 1.0, section 6.3. Attributes without a prefix are in no namespace, and the
-// parser itself refuses one that is written twice, so that only prefixed ones are compared.
+// Namespaces in XML 1.0, section 6.3. Only attributes with a prefix are compared: those without one
+// are in no namespace, and the parser itself refuses duplicates of them.
 void DocumentHandler::CheckAttributeNames(const ElementNode& element, const Position& position) {
   expandedNames_.clear();
   for (std::size_t index = 0; index < element.AttributeCount(); ++index) {
@@ -250,7 +248,8 @@ void DocumentHandler::CheckAttributeNames(const ElementNode& element, const Posi
     }
   }
   if (HasDuplicate()) {
-    throw XMLParseException("Two attributes of element " + Quoted(element.QualifiedNameText()) +
+    throw XMLParseException("Two attributes of element " +
+                                QuoteVerbatim(element.QualifiedNameText()) +
                                 " have the same name in one namespace",
                             position);
   }

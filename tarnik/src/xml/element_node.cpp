@@ -7,8 +7,9 @@
 
 #include <tarnik/core/exception.h>
 
+#include "support/quote.h"
+#include "xml/equal_prefixes.h"
 #include "xml/namespaces.h"
-#include "xml/short_text.h"
 #include "xml/tree_builder.h"
 #include "xml/xml_chars.h"
 
@@ -18,25 +19,21 @@ namespace {
 
 constexpr unsigned kFirstAttributeCapacity = 4;
 
-std::string Quoted(std::string_view name) {
-  return "'" + std::string(name) + "'";
-}
-
 void CheckAttribute(const ElementNode& element, std::string_view name, std::string_view value) {
   if (!IsQualifiedName(name)) {
     throw InvalidArgumentException("An attribute name of element " +
-                                   Quoted(element.QualifiedNameText()) +
+                                   QuoteVerbatim(element.QualifiedNameText()) +
                                    " is not a qualified name.");
   }
   if (!IsXmlText(value)) {
-    throw InvalidArgumentException("Attribute " + Quoted(name) + " of element " +
-                                   Quoted(element.QualifiedNameText()) +
+    throw InvalidArgumentException("Attribute " + QuoteVerbatim(name) + " of element " +
+                                   QuoteVerbatim(element.QualifiedNameText()) +
                                    " holds what XML cannot carry: a control character or bytes "
                                    "that are not UTF-8.");
   }
   if (value.size() > std::numeric_limits<unsigned>::max()) {
-    throw InvalidArgumentException("Attribute " + Quoted(name) + " of element " +
-                                   Quoted(element.QualifiedNameText()) + " is too long.");
+    throw InvalidArgumentException("Attribute " + QuoteVerbatim(name) + " of element " +
+                                   QuoteVerbatim(element.QualifiedNameText()) + " is too long.");
   }
 }
 
@@ -77,7 +74,8 @@ std::optional<std::string_view> ElementNode::LookupNamespace(
     }
     for (unsigned index = 0; index < element->attributeCount_; ++index) {
       const Attribute& attribute = element->attributes_[index];
-      if (attribute.name_->isDeclaration && EqualShort(attribute.name_->DeclaredPrefix(), prefix)) {
+      if (attribute.name_->isDeclaration &&
+          EqualPrefixes(attribute.name_->DeclaredPrefix(), prefix)) {
         return attribute.Value();
       }
     }

@@ -8,12 +8,12 @@ namespace Tarnik::Xml {
 
 namespace {
 
-// A token of a few KB takes one block. Larger pieces are given back when Expat frees them, so that
-// buffers which grow with the document do not add up.
+// A document of a few KB needs one block. Larger pieces are freed when Expat frees them, so that
+// buffers which grow with the document do not accumulate.
 constexpr std::size_t kBlockBytes = 16384;
 constexpr std::size_t kLargestSmall = 2048;
 
-// Stands before each piece.
+// Precedes each piece.
 struct alignas(std::max_align_t) Header {
   std::size_t size;  // of the piece, without the header
 };

@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_EXPAT_MEMORY_H
-#define TARNIK_SRC_XML_EXPAT_MEMORY_H
+#ifndef TARNIK_XML_EXPAT_MEMORY_H
+#define TARNIK_XML_EXPAT_MEMORY_H
 
 #include <expat.h>
 
@@ -7,12 +7,12 @@
 
 namespace Tarnik::Xml {
 
-/// The memory of one Expat parser. All of it is cleansed before it is given back, since documents
-/// hold passwords and tokens; and the many small pieces that a parser asks for come out of a few
-/// blocks, which live as long as this object.
+/// The memory of one Expat parser. It is cleansed before it is freed, since documents contain
+/// passwords and tokens. The many small pieces that a parser allocates are taken from a few blocks,
+/// which live as long as this object.
 ///
-/// Expat's functions for memory know nothing of the parser that calls them: a parser may be made
-/// and used only while a `Scope` of its memory is open on the thread.
+/// Expat does not pass the parser to its memory functions, so a parser may be created and used only
+/// while a `Scope` of its memory is open on the thread.
 class ExpatMemory {
  public:
   class Scope {
@@ -29,7 +29,7 @@ class ExpatMemory {
   ExpatMemory() = default;
   ExpatMemory(const ExpatMemory&) = delete;
   ExpatMemory& operator=(const ExpatMemory&) = delete;
-  /// To be destroyed after the parser.
+  /// Must be destroyed after the parser.
   ~ExpatMemory();
 
   static const XML_Memory_Handling_Suite& Suite() noexcept;

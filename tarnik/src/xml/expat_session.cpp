@@ -15,12 +15,12 @@ namespace {
 
 static_assert(sizeof(XML_Char) == 1, "Expat must be built for UTF-8");
 
-// Expat asks the system for a salt for each parser unless it is given one.
+// Without a salt, Expat would request one from the system for each parser.
 unsigned long HashSalt() noexcept {
   static const unsigned long salt = [] {
     unsigned long value = 0;
     if (getrandom(&value, sizeof(value), 0) != static_cast<ssize_t>(sizeof(value))) {
-      value = 0;  // leaves it to Expat
+      value = 0;  // Expat then generates one
     }
     return value;
   }();
@@ -82,12 +82,12 @@ void ExpatSession::ParseBuffer(std::size_t size, bool last) {
     ThrowSyntaxError();
   }
   if (!last) {
-    // What lies before the token that is not complete leaves the buffer with the next chunk.
+    // The next chunk removes everything before the incomplete token from the buffer.
     Locate();
   }
 }
 
-// Expat turns to UTF-16 when it meets these, whatever encoding it was told.
+// Expat switches to UTF-16 at these bytes, whatever encoding it was given.
 void ExpatSession::CheckFirstBytes(const char* bytes, std::size_t size) {
   if (size < 2) {
     return;
@@ -99,7 +99,7 @@ void ExpatSession::CheckFirstBytes(const char* bytes, std::size_t size) {
   }
 }
 
-// Expat can tell the place itself, but walks each byte again for it.
+// Expat can compute the position itself, but scans each byte again for it.
 const Position& ExpatSession::Locate() {
   const long byte = XML_GetCurrentByteIndex(parser_.get());
   if (byte <= locatedByte_) {
@@ -118,7 +118,7 @@ const Position& ExpatSession::Locate() {
   return located_;
 }
 
-// The first line feed at `from` or behind it in Expat's buffer; `current` is the byte of the event.
+// The first line feed at or after `from` in Expat's buffer; `current` is the byte of the event.
 long ExpatSession::FindLineFeed(long from, long current) const {
   int offset = 0;
   int size = 0;
@@ -141,7 +141,7 @@ void ExpatSession::ThrowSyntaxError() {
 
 template <class Action>
 void ExpatSession::Handle(Action action) noexcept {
-  // Expat may report a few more events after it was told to stop.
+  // Expat may report a few more events after XML_StopParser.
   if (failure_ != nullptr) {
     return;
   }
@@ -159,7 +159,7 @@ void ExpatSession::OnXmlDeclaration(void* session, const char* version, const ch
       throw XMLParseException("The document is not XML 1.0", position);
     }
     if (encoding != nullptr && StringUtil::ToLower(encoding) != "utf-8") {
-      throw XMLParseException("The document declares another encoding than UTF-8", position);
+      throw XMLParseException("The document declares an encoding other than UTF-8", position);
     }
   });
 }

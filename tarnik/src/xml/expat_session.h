@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_EXPAT_SESSION_H
-#define TARNIK_SRC_XML_EXPAT_SESSION_H
+#ifndef TARNIK_XML_EXPAT_SESSION_H
+#define TARNIK_XML_EXPAT_SESSION_H
 
 #include <expat.h>
 
@@ -17,14 +17,14 @@
 
 namespace Tarnik::Xml {
 
-/// One run of Expat over one document: hands what it finds to a handler and holds the limits.
+/// Parses one document with Expat: passes its events to a handler and enforces the limits.
 class ExpatSession {
  public:
   explicit ExpatSession(XMLHandler& handler);
 
-  /// Room for the next `size` bytes of the document, valid until `ParseBuffer`.
+  /// A buffer for the next `size` bytes of the document, valid until `ParseBuffer`.
   char* Buffer(std::size_t size);
-  /// Parses the `size` bytes that were put into the buffer.
+  /// Parses the `size` bytes that were written to the buffer.
   void ParseBuffer(std::size_t size, bool last);
 
  private:
@@ -46,12 +46,12 @@ class ExpatSession {
   static void OnComment(void* session, const char* text);
   static void OnProcessingInstruction(void* session, const char* target, const char* text);
 
-  // Runs `action` for an event of Expat, which no exception may pass through.
+  // Runs `action` for an event. Exceptions are kept, since they must not pass through Expat.
   template <class Action>
   void Handle(Action action) noexcept;
 
   void CheckFirstBytes(const char* bytes, std::size_t size);
-  /// The place of the current event.
+  /// The position of the current event.
   const Position& Locate();
   long FindLineFeed(long from, long current) const;
   void ThrowSyntaxError();
@@ -69,7 +69,7 @@ class ExpatSession {
   // Where the event before the current one begins.
   long locatedByte_ = 0;
   long lineStartByte_ = 0;
-  // The next line feed of the chunk, which saves a search for each event.
+  // The next line feed of the chunk, cached to avoid a search for each event.
   long lineFeedByte_ = kUnknown;
   Position located_{1, 1};
 };

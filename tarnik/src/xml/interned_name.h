@@ -1,12 +1,12 @@
-#ifndef TARNIK_SRC_XML_INTERNED_NAME_H
-#define TARNIK_SRC_XML_INTERNED_NAME_H
+#ifndef TARNIK_XML_INTERNED_NAME_H
+#define TARNIK_XML_INTERNED_NAME_H
 
 #include <string_view>
 
 namespace Tarnik::Xml {
 
-/// A qualified name kept in a tree; its characters follow it in memory. Most names of a document
-/// repeat, so nodes and attributes share them.
+/// A qualified name stored in a tree; its characters follow it in memory. Shared by nodes and
+/// attributes, since most names of a document occur many times.
 struct InternedName {
   unsigned length;
   unsigned prefixLength : 31;

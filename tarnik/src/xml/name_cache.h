@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_NAME_CACHE_H
-#define TARNIK_SRC_XML_NAME_CACHE_H
+#ifndef TARNIK_XML_NAME_CACHE_H
+#define TARNIK_XML_NAME_CACHE_H
 
 #include <array>
 #include <cstddef>
@@ -11,11 +11,11 @@
 
 namespace Tarnik::Xml {
 
-/// Finds names that a document has used before. Each name has one slot, where a later name may
-/// take its place: a document of names chosen to collide costs memory, never time.
+/// Finds names that occurred before in a document. Each name has one slot, where a later name may
+/// replace it: a document with colliding names costs memory but no time.
 class NameCache {
  public:
-  /// The slot of `name`; it holds that name, another one or null.
+  /// The slot of `name`, which contains that name, another one or null.
   const InternedName*& SlotOf(std::string_view name) noexcept {
     return slots_[Hash(name) % kSlots];
   }

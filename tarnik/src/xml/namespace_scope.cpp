@@ -1,13 +1,13 @@
 #include "xml/namespace_scope.h"
 
-#include "xml/short_text.h"
+#include "xml/equal_prefixes.h"
 
 namespace Tarnik::Xml {
 
 NamespaceScope::Binding* NamespaceScope::Find(std::string_view prefix) noexcept {
   if (!indexed_) {
     for (std::size_t index = bindings_.size(); index > 0; --index) {
-      if (EqualShort(bindings_[index - 1].prefix, prefix)) {
+      if (EqualPrefixes(bindings_[index - 1].prefix, prefix)) {
         return &bindings_[index - 1];
       }
     }

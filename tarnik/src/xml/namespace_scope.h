@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_NAMESPACE_SCOPE_H
-#define TARNIK_SRC_XML_NAMESPACE_SCOPE_H
+#ifndef TARNIK_XML_NAMESPACE_SCOPE_H
+#define TARNIK_XML_NAMESPACE_SCOPE_H
 
 #include <cstddef>
 #include <map>
@@ -10,14 +10,14 @@ namespace Tarnik::Xml {
 
 /// The namespace declarations in scope while a tree is walked, innermost last.
 ///
-/// A few declarations are searched one by one, which is fastest; an index keeps searches short when
-/// a document declares many. Views must outlive the scope.
+/// A few declarations are searched linearly, which is fastest; when a document declares many, they
+/// are indexed. Views must outlive the scope.
 class NamespaceScope {
  public:
   struct Binding {
     std::string_view prefix;
     std::string_view uri;
-    /// What a canonical text has bound to the prefix so far; empty for nothing.
+    /// The URI that the canonical output has bound to the prefix so far; empty for none.
     std::string_view rendered;
     unsigned depth;
   };
@@ -29,7 +29,7 @@ class NamespaceScope {
 
   void Push(const Binding& binding);
 
-  /// Drops what was pushed for elements as deep as `depth` or deeper.
+  /// Removes the bindings of elements at `depth` and deeper.
   void PopTo(unsigned depth) noexcept {
     while (!bindings_.empty() && bindings_.back().depth >= depth) {
       Pop();

@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_NAMESPACES_H
-#define TARNIK_SRC_XML_NAMESPACES_H
+#ifndef TARNIK_XML_NAMESPACES_H
+#define TARNIK_XML_NAMESPACES_H
 
 #include <string_view>
 

@@ -3,6 +3,7 @@
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/element_node.h>
 
+#include "support/quote.h"
 #include "xml/tree.h"
 #include "xml/tree_builder.h"
 
@@ -108,13 +109,13 @@ void ParentNode::AppendChild(Node* child) {
   if (Kind() == NodeKind::kDocument) {
     CheckChildOfDocument(*this, *child);
   }
-  // A node that has no children holds nothing but itself: leaves need no walk to the root.
+  // A node without children contains only itself, so leaves need no walk to the root.
   const ElementNode* element = AsElement(child);
   const bool mayHoldThis = element != nullptr && (element->LastChild() != nullptr || child == this);
   for (const Node* node = this; mayHoldThis && node != nullptr; node = node->parent_) {
     if (node == child) {
-      throw InvalidArgumentException("Element '" + std::string(element->QualifiedNameText()) +
-                                     "' cannot be placed inside itself.");
+      throw InvalidArgumentException("Element " + QuoteVerbatim(element->QualifiedNameText()) +
+                                     " cannot be placed inside itself.");
     }
   }
   if (child->parent_ != nullptr) {

@@ -7,12 +7,12 @@ namespace Tarnik::Xml {
 
 namespace {
 
-// Sixteen characters that are compared at once: nearly all blocks of a document hold nothing to
+// Sixteen characters are compared at once, since nearly all blocks of a document have nothing to
 // escape.
 constexpr std::size_t kBlock = 16;
 using Block = unsigned char __attribute__((vector_size(kBlock)));
 
-// What to escape, told for a character and for a block of them alike.
+// The characters to escape, for single characters and for blocks.
 struct IsTextSpecial {
   template <class T>
   auto operator()(const T& value) const noexcept {
@@ -23,7 +23,7 @@ struct IsTextSpecial {
 struct IsAttributeSpecial {
   template <class T>
   auto operator()(const T& value) const noexcept {
-    // Of the characters below the blank, XML has tab, line feed and carriage return alone.
+    // The only characters below the blank in XML are tab, line feed and carriage return.
     return (value == '&') | (value == '<') | (value == '"') | (value < ' ');
   }
 };
@@ -44,8 +44,8 @@ std::size_t FindSpecial(std::string_view text, IsSpecial isSpecial) noexcept {
   while (text.size() - position >= kBlock && IsPlainBlock(text.data() + position, isSpecial)) {
     position += kBlock;
   }
-  // The rest of a text that is longer than a block: looking at some characters again is cheaper
-  // than looking at each alone.
+  // The rest of a text longer than a block is checked as the last block of the text, which overlaps
+  // with the one before. This is cheaper than checking its characters one by one.
   if (position > 0 && text.size() - position < kBlock &&
       IsPlainBlock(text.data() + text.size() - kBlock, isSpecial)) {
     return text.size();

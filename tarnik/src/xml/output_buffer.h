@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_OUTPUT_BUFFER_H
-#define TARNIK_SRC_XML_OUTPUT_BUFFER_H
+#ifndef TARNIK_XML_OUTPUT_BUFFER_H
+#define TARNIK_XML_OUTPUT_BUFFER_H
 
 #include <array>
 #include <cstddef>
@@ -10,13 +10,13 @@
 
 namespace Tarnik::Xml {
 
-/// Gathers small pieces of XML text into large writes.
+/// Collects small pieces of XML text into large writes.
 class OutputBuffer {
  public:
   explicit OutputBuffer(Writer& writer) noexcept : writer_(writer) {}
   OutputBuffer(const OutputBuffer&) = delete;
   OutputBuffer& operator=(const OutputBuffer&) = delete;
-  /// Cleanses what passed through; writes nothing.
+  /// Cleanses the buffer without writing it.
   ~OutputBuffer();
 
   void Append(char character) {
@@ -44,7 +44,7 @@ class OutputBuffer {
   void AppendComment(std::string_view text);
   void AppendProcessingInstruction(std::string_view target, std::string_view text);
 
-  /// Hands all to the writer; to be called at the end.
+  /// Writes all buffered text to the writer. Must be called at the end.
   void Flush();
 
  private:

@@ -10,8 +10,8 @@ namespace Tarnik::Xml {
 
 namespace {
 
-// Blocks are a small part of the tree that they belong to: what is left free in the last one is the
-// memory that a living tree wastes.
+// The size of a block is a small fraction of its tree, since the free rest of the last block is
+// wasted memory.
 constexpr std::size_t kMinBlockBytes = 512;
 constexpr std::size_t kMaxBlockBytes = 16384;
 constexpr std::size_t kBlocksPerTree = 32;
@@ -43,7 +43,8 @@ void Tree::Join(Tree& first, Tree& second) noexcept {
   if (kept == joined) {
     return;
   }
-  // The smaller follows the larger, which bounds the length of the chains by the logarithm.
+  // The smaller tree points to the larger one, which limits the length of these chains to the
+  // logarithm of the size.
   if (kept->totalBytes_ < joined->totalBytes_) {
     std::swap(kept, joined);
   }
@@ -94,7 +95,7 @@ void* Tree::AllocateBytes(std::size_t bytes, std::size_t alignment) {
   if (room < padding || room - padding < bytes) {
     return AllocateFromNewBlock(bytes);
   }
-  // Characters fill a block from its end, where they leave no gaps between the nodes.
+  // Characters fill a block from its end, so that they leave no gaps between nodes.
   if (alignment == 1) {
     freeEnd_ -= bytes;
     return freeEnd_;
@@ -107,7 +108,7 @@ void* Tree::AllocateBytes(std::size_t bytes, std::size_t alignment) {
 void* Tree::AllocateFromNewBlock(std::size_t bytes) {
   const std::size_t usual =
       std::clamp(totalBytes_ / kBlocksPerTree, kMinBlockBytes, kMaxBlockBytes);
-  // What is large gets a block of its own, so that the room left in the open one is not lost.
+  // Large pieces get a separate block, so that the rest of the current block stays usable.
   const bool large = bytes > usual / 4;
   const std::size_t size = large ? sizeof(Block) + bytes : usual;
   Block* block = CreateBlock(size);
@@ -123,7 +124,7 @@ void* Tree::AllocateFromNewBlock(std::size_t bytes) {
 }
 
 void Tree::Destroy() noexcept {
-  // This object lies in one of the blocks: it is not to be touched in the loop.
+  // This object is in one of the blocks, so the loop must not use it.
   Block* block = firstBlock_;
   while (block != nullptr) {
     Block* next = block->next;

@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_TREE_H
-#define TARNIK_SRC_XML_TREE_H
+#ifndef TARNIK_XML_TREE_H
+#define TARNIK_XML_TREE_H
 
 #include <atomic>
 #include <boost/smart_ptr/intrusive_ptr.hpp>
@@ -10,17 +10,16 @@
 
 namespace Tarnik::Xml {
 
-/// The memory that a tree's nodes, names, attributes and texts live in, with one reference count
-/// for all of them.
+/// The memory of a tree's nodes, names, attributes and texts, with one reference count for all of
+/// them.
 ///
-/// Nothing is freed before the whole tree is: there are no destructors of nodes to run, so the
-/// death of a tree takes no recursion however deep it is. The object itself lies in its first
-/// block.
+/// All memory is freed together and no destructors of nodes run, so deleting a tree needs no
+/// recursion, however deep it is. The object itself is in its first block.
 class Tree {
  public:
   using Holder = boost::intrusive_ptr<Tree>;
 
-  /// First blocks: for a single node made by hand, and for a document.
+  /// Sizes of the first block: for a single node created by a caller, and for a document.
   static constexpr std::size_t kNodeBlockBytes = 512;
   static constexpr std::size_t kDocumentBlockBytes = 4096;
 
@@ -29,7 +28,7 @@ class Tree {
   Tree(const Tree&) = delete;
   Tree& operator=(const Tree&) = delete;
 
-  /// The tree that now holds what this one held: itself unless it was joined to another.
+  /// The tree that now owns the nodes of this one: this tree unless it was joined to another.
   Tree& Current() noexcept {
     Tree* tree = this;
     while (tree->joinedTo_ != nullptr) {
@@ -45,7 +44,7 @@ class Tree {
   /// Joins two trees; references to either keep both alive from then on.
   static void Join(Tree& first, Tree& second) noexcept;
 
-  /// Memory for `count` objects of `T`, which stay without destruction.
+  /// Memory for `count` objects of `T`, whose destructors never run.
   template <class T>
   T* Allocate(std::size_t count = 1) {
     return static_cast<T*>(Current().AllocateBytes(count * sizeof(T), alignof(T)));

@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_TREE_BUILDER_H
-#define TARNIK_SRC_XML_TREE_BUILDER_H
+#ifndef TARNIK_XML_TREE_BUILDER_H
+#define TARNIK_XML_TREE_BUILDER_H
 
 #include <algorithm>
 #include <new>
@@ -14,8 +14,8 @@
 
 namespace Tarnik::Xml {
 
-/// Makes nodes in a tree without the checks of the public interface, and gives the readers of this
-/// folder direct access to names.
+/// Creates nodes in a tree without the checks of the public interface, and gives the code of this
+/// folder direct access to names and attributes.
 class TreeBuilder {
  public:
   static Document* NewDocument(Tree& tree) {
@@ -57,13 +57,13 @@ class TreeBuilder {
     return node;
   }
 
-  /// Gives `element` room for `count` attributes, which `PutAttribute` fills in order.
+  /// Allocates memory for `count` attributes of `element`, which `PutAttribute` fills in order.
   static void ReserveAttributes(ElementNode& element, Tree& tree, std::size_t count) {
     element.attributes_ = tree.Allocate<Attribute>(count);
     element.attributeCapacity_ = static_cast<unsigned>(count);
   }
 
-  /// `value` is kept as it is and must live in the tree.
+  /// `value` is not copied and must be stored in the tree.
   static void PutAttribute(ElementNode& element, const InternedName* name, std::string_view value) {
     auto* attribute = new (element.attributes_ + element.attributeCount_) Attribute;
     *attribute = MakeAttribute(name, value);
@@ -79,7 +79,7 @@ class TreeBuilder {
     return attribute;
   }
 
-  /// `child` must have no parent and live in the tree of `parent`.
+  /// `child` must be in the tree of `parent` and have no parent.
   static void Append(ParentNode& parent, Node& child) noexcept {
     child.parent_ = &parent;
     child.next_ = &child;

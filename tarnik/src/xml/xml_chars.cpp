@@ -23,7 +23,7 @@ constexpr Range kNameStart[] = {
     {0xF8, 0x2FF},    {0x370, 0x37D},   {0x37F, 0x1FFF},  {0x200C, 0x200D}, {0x2070, 0x218F},
     {0x2C00, 0x2FEF}, {0x3001, 0xD7FF}, {0xF900, 0xFDCF}, {0xFDF0, 0xFFFD}, {0x10000, 0xEFFFF},
 };
-// Production 4a: what may follow besides.
+// Production 4a: the further characters that may follow.
 constexpr Range kNameRest[] = {
     {'-', '.'}, {'0', '9'}, {0xB7, 0xB7}, {0x300, 0x36F}, {0x203F, 0x2040},
 };
@@ -48,7 +48,7 @@ char32_t Continuation(std::string_view text, std::size_t index) noexcept {
   return (byte & 0xC0) == 0x80 ? byte & 0x3F : kInvalid;
 }
 
-// Takes the first character from `text`; RFC 3629 section 4 says which sequences are valid.
+// Removes the first character from `text`. RFC 3629, section 4 defines the valid sequences.
 char32_t TakeCharacter(std::string_view& text) noexcept {
   const auto lead = static_cast<unsigned char>(text.front());
   if (lead < 0x80) {
@@ -83,7 +83,7 @@ bool IsXmlCharacter(char32_t character) noexcept {
   return character != 0xFFFE && character != 0xFFFF && character != kInvalid;
 }
 
-// Leaves out the octets in front of `text` that are plain ASCII, eight at a time: most text is.
+// Skips octets from 0x20 to 0x7F at the front of `text`, eight at a time: most text has no others.
 void SkipPlainText(std::string_view& text) noexcept {
   constexpr std::uint64_t kBlanks = 0x2020202020202020;
   constexpr std::uint64_t kHighBits = 0x8080808080808080;

@@ -1,11 +1,11 @@
-#ifndef TARNIK_SRC_XML_XML_CHARS_H
-#define TARNIK_SRC_XML_XML_CHARS_H
+#ifndef TARNIK_XML_XML_CHARS_H
+#define TARNIK_XML_XML_CHARS_H
 
 #include <string_view>
 
 namespace Tarnik::Xml {
 
-/// True when `text` is UTF-8 and holds nothing but characters of XML 1.0 (section 2.2).
+/// True when `text` is UTF-8 and all its characters are allowed in XML 1.0 (section 2.2).
 bool IsXmlText(std::string_view text) noexcept;
 
 /// True for a name without a colon (Namespaces in XML 1.0, section 3; the characters of XML 1.0,

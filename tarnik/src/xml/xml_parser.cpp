@@ -11,7 +11,7 @@ namespace Tarnik::Xml {
 
 namespace {
 
-// The size of a usual token. Expat adds 1 KiB and rounds up to a power of two.
+// The size of a usual security token. Expat adds 1 KiB and rounds up to a power of two.
 constexpr std::size_t kFirstChunkBytes = std::size_t{7} * 1024;
 
 class XMLParserImpl final : public XMLParser, public ObjectImpl {
@@ -25,8 +25,8 @@ class XMLParserImpl final : public XMLParser, public ObjectImpl {
     const Ref<XMLHandler> handler = std::move(handler_);
     const Ref<Reader> reader = std::move(reader_);
     ExpatSession session(*handler);
-    // Each chunk is as long as all before it. A token that is not complete is scanned again with
-    // the next chunk, so that chunks of one length would make long tokens quadratic.
+    // Each chunk is as long as all previous ones together. Expat scans an incomplete token again
+    // with the next chunk, so chunks of equal length would make long tokens take quadratic time.
     std::size_t chunkBytes = kFirstChunkBytes;
     std::size_t total = 0;
     for (bool last = false; !last; chunkBytes = std::max(chunkBytes, total)) {

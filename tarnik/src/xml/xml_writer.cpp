@@ -66,7 +66,7 @@ void WriteXml(const Node* node, Writer* writer) {
   OutputBuffer output(*writer);
   const Node* current = node;
   WriteStart(*current, output);
-  // A walk instead of a recursion: trees made by hand may be as deep as memory allows.
+  // Iterative, since trees that callers build may be as deep as memory allows.
   while (true) {
     if (const Node* child = FirstChildOf(*current)) {
       current = child;

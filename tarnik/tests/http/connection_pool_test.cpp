@@ -1,4 +1,4 @@
-#include "http/connection_pool.h"
+#include "http/idle_connections.h"
 
 #include "http/exchange_fixture.h"
 
@@ -140,7 +140,7 @@ TEST_F(ConnectionPoolTest, ClosesAConnectionThatIsFreeAfterTheAgentHasDied) {
 TEST_F(ConnectionPoolTest, KeepsEightIdleConnectionsToAPlace) {
   Use({});
   ExchangeAtOnce(12);
-  EXPECT_EQ(OpenCount(), kMaxIdlePerPlace);
+  EXPECT_EQ(OpenCount(), kMaxIdlePerEndpoint);
 }
 
 TEST_F(ConnectionPoolTest, KeepsSixtyFourIdleConnectionsInAll) {

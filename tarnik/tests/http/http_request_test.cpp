@@ -2,7 +2,7 @@
 
 #include <tarnik/core/checked_cast.h>
 
-#include "http/client_request.h"
+#include "http/http_request_impl.h"
 
 namespace Tarnik::Http {
 namespace {
@@ -129,14 +129,14 @@ INSTANTIATE_TEST_SUITE_P(
         BadHeader{"X", "a\r\nY: b", kBadValue}, BadHeader{"X", "a\nb", kBadValue},
         BadHeader{"X", "a\rb", kBadValue}, BadHeader{"X", std::string("a\0", 2), kBadValue},
         BadHeader{"X", "a\tb", kBadValue},
-        BadHeader{"Host", "evil", "The HTTP header Host is set by the user agent alone."},
+        BadHeader{"Host", "evil", "The HTTP header Host is set only by the user agent."},
         BadHeader{"content-length", "1",
-                  "The HTTP header content-length is set by the user agent alone."},
+                  "The HTTP header content-length is set only by the user agent."},
         BadHeader{"Transfer-Encoding", "chunked",
-                  "The HTTP header Transfer-Encoding is set by the user agent alone."},
+                  "The HTTP header Transfer-Encoding is set only by the user agent."},
         BadHeader{"CONNECTION", "close",
-                  "The HTTP header CONNECTION is set by the user agent alone."},
-        BadHeader{"Cookie", "a=1", "The HTTP header Cookie is set by the user agent alone."}));
+                  "The HTTP header CONNECTION is set only by the user agent."},
+        BadHeader{"Cookie", "a=1", "The HTTP header Cookie is set only by the user agent."}));
 
 }  // namespace
 }  // namespace Tarnik::Http

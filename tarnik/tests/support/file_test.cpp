@@ -1,4 +1,4 @@
-#include "support/file.h"
+#include "system/file.h"
 
 #include <gtest/gtest.h>
 #include <unistd.h>
@@ -9,6 +9,8 @@
 
 namespace Tarnik {
 namespace {
+
+using System::ReadFile;
 
 std::string RefusalOf(const std::string& path) {
   try {

@@ -183,7 +183,7 @@ TEST_P(NamespaceFaultTest, IsRefusedWithItsMessage) {
 constexpr const char* kXmlnsMessage =
     "Neither the prefix 'xmlns' nor its namespace can be declared at line 1, column 1";
 constexpr const char* kXmlMessage =
-    "The prefix 'xml' and its namespace belong to each other alone at line 1, column 1";
+    "The prefix 'xml' and its namespace belong only to each other at line 1, column 1";
 
 INSTANTIATE_TEST_SUITE_P(
     Names, NamespaceFaultTest,

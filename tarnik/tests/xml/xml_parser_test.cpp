@@ -217,7 +217,7 @@ TEST_P(XMLParserFaultTest, IsRefusedWithItsMessage) {
 constexpr const char* kDoctypeMessage =
     "The document holds a DOCTYPE, which is not accepted at line 1, column ";
 constexpr const char* kEncodingMessage =
-    "The document declares another encoding than UTF-8 at line 1, column 1";
+    "The document declares an encoding other than UTF-8 at line 1, column 1";
 constexpr const char* kUtf16Message =
     "The document is in UTF-16 or UTF-32; only UTF-8 is accepted at line 1, column 1";
 constexpr const char* kTokenMessage = "not well-formed (invalid token) at line 1, column ";
@@ -246,7 +246,7 @@ INSTANTIATE_TEST_SUITE_P(
         FaultCase{"Ascii", "<?xml version='1.0' encoding='US-ASCII'?><a/>", kEncodingMessage},
         FaultCase{"BomAgainstDeclaration",
                   "\xEF\xBB\xBF<?xml version='1.0' encoding='UTF-16'?><a/>",
-                  "The document declares another encoding than UTF-8 at line 1, column 4"},
+                  "The document declares an encoding other than UTF-8 at line 1, column 4"},
         FaultCase{"Utf16LittleEndianMark", std::string("\xFF\xFE<\0a\0/\0>\0", 10), kUtf16Message},
         FaultCase{"Utf16BigEndianMark", std::string("\xFE\xFF\0<\0a\0/\0>", 10), kUtf16Message},
         FaultCase{"Utf16LittleEndian", std::string("<\0a\0/\0>\0", 8), kUtf16Message},

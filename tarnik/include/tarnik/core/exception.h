@@ -9,7 +9,7 @@
 
 namespace Tarnik {
 
-/// Base of all failures that a caller may handle. Carries one message.
+/// Base class of all failures that a caller may handle. Contains one message.
 class TARNIK_EXPORT Exception : public Throwable {
  public:
   explicit Exception(std::string message, const boost::source_location& where = CurrentLocation());
@@ -18,7 +18,7 @@ class TARNIK_EXPORT Exception : public Throwable {
   [[noreturn]] void Throw() const override;
 };
 
-/// An argument that the called function cannot accept.
+/// An argument that the called function does not accept.
 class TARNIK_EXPORT InvalidArgumentException : public Exception {
  public:
   explicit InvalidArgumentException(std::string message,
@@ -28,7 +28,7 @@ class TARNIK_EXPORT InvalidArgumentException : public Exception {
   [[noreturn]] void Throw() const override;
 };
 
-/// An object that is not in the state which the called function needs.
+/// An object that is not in the state that the called function requires.
 class TARNIK_EXPORT InvalidStateException : public Exception {
  public:
   explicit InvalidStateException(std::string message,
@@ -38,7 +38,7 @@ class TARNIK_EXPORT InvalidStateException : public Exception {
   [[noreturn]] void Throw() const override;
 };
 
-/// An object that is not of the class that it was taken for.
+/// An object that is not of the expected class.
 class TARNIK_EXPORT TypeMismatchException : public Exception {
  public:
   explicit TypeMismatchException(std::string message,

@@ -7,7 +7,7 @@
 
 namespace Tarnik {
 
-/// Root of every reference-counted object of the platform. Held by `Ref<T>`; never deleted
+/// Base class of all reference-counted objects of the platform. Held by `Ref<T>`; never deleted
 /// directly.
 ///
 /// Counting is thread-safe. The order of the virtual functions is part of the binary interface.
@@ -19,11 +19,11 @@ class TARNIK_EXPORT Object {
 
   /// Adds one reference.
   virtual void IncRef() const noexcept = 0;
-  /// Drops one reference; the object dies with its last one.
+  /// Removes one reference; the object is destroyed with its last one.
   virtual void DecRef() const noexcept = 0;
-  /// A one-line description for diagnostics; never holds secrets.
+  /// A one-line description for diagnostics; never contains secrets.
   virtual std::string ToString() const = 0;
-  /// The number of references at this moment; a diagnostic, stale as soon as it is read.
+  /// The current number of references, for diagnostics; it may change at any time.
   virtual long RefCount() const noexcept = 0;
 
  protected:
@@ -32,7 +32,8 @@ class TARNIK_EXPORT Object {
  public:
   /// Called when the first reference is taken. Does nothing unless overridden.
   virtual void OnFirstRef() const noexcept {}
-  /// Called when the last reference has gone, before destruction. Does nothing unless overridden.
+  /// Called when the last reference was removed, before destruction. Does nothing unless
+  /// overridden.
   virtual void OnLastRef() const noexcept {}
 };
 

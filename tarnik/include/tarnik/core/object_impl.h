@@ -8,7 +8,7 @@
 
 namespace Tarnik {
 
-/// The reference count that implementations of platform interfaces inherit.
+/// Reference counting for implementations of platform interfaces.
 ///
 /// `Object` is a virtual base, so that a class may combine one or more interfaces with this one:
 /// `class MyResolver : public KeyInfoResolver, public ObjectImpl`.
@@ -19,8 +19,8 @@ class TARNIK_EXPORT ObjectImpl : public virtual Object {
   /// "<ClassName>" unless overridden.
   std::string ToString() const override;
   long RefCount() const noexcept override;
-  // Without overriders of its own, this class would have empty slots wherever another base of the
-  // object has claimed the shared `Object` (Itanium C++ ABI, section 2.5.2).
+  // Overridden here, since this class would otherwise have empty vtable slots where another base
+  // class shares its vtable with the virtual base `Object` (Itanium C++ ABI, section 2.5.2).
   void OnFirstRef() const noexcept override;
   void OnLastRef() const noexcept override;
 
@@ -28,7 +28,7 @@ class TARNIK_EXPORT ObjectImpl : public virtual Object {
   ObjectImpl() = default;
   ~ObjectImpl() override;
 
-  /// Takes a reference unless the count has already fallen to zero; false if it has.
+  /// Adds a reference unless the count is already zero; false if it is.
   bool IncRefIfAlive() const noexcept;
 
  private:

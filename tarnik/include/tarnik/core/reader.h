@@ -9,15 +9,15 @@
 
 namespace Tarnik {
 
-/// A source of bytes that is read once, front to back. Used by one thread at a time.
+/// A source of bytes that is read once, from front to back. Used by one thread at a time.
 class TARNIK_EXPORT Reader : public virtual Object {
  public:
-  /// Reads up to `size` bytes into `buffer` and returns how many; 0 only at the end (or for size
-  /// 0).
+  /// Reads up to `size` bytes into `buffer` and returns their number: 0 only at the end, or if
+  /// `size` is 0.
   virtual std::size_t Read(char* buffer, std::size_t size) = 0;
 };
 
-/// A reader over `text`, which it keeps; the text is cleansed from memory when the reader dies.
+/// A reader of `text`, which it owns; the text is cleansed when the reader is destroyed.
 TARNIK_EXPORT Ref<Reader> CreateStringReader(std::string text);
 
 }  // namespace Tarnik

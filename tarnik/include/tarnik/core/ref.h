@@ -12,7 +12,7 @@ namespace Tarnik {
 template <class T>
 using Ref = boost::intrusive_ptr<T>;
 
-/// Makes a `T` and returns the first reference to it.
+/// Creates a `T` and returns the first reference to it.
 template <class T, class... Arguments>
 Ref<T> MakeRef(Arguments&&... arguments) {
   return Ref<T>(new T(std::forward<Arguments>(arguments)...));

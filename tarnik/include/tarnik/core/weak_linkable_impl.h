@@ -15,7 +15,7 @@ namespace Tarnik {
 /// Filled by `WeakLinkableImpl::AttachWeakRef`; safe to use from any thread.
 class WeakRef {
  public:
-  /// The object, or null when it has died or none was attached.
+  /// The object, or null when it was destroyed or none was attached.
   Ref<const Object> Lock() const { return state_ == nullptr ? nullptr : state_->Lock(); }
 
  private:
@@ -44,7 +44,8 @@ class WeakRef {
   std::shared_ptr<State> state_;
 };
 
-/// Adds weak references to a counted base. The two functions below extend the slot order of `Base`.
+/// Adds weak references to a reference-counted base class. `AttachWeakRef` and `HasLink` extend the
+/// vtable of `Base` in this order.
 template <class Base>
 class WeakLinkableImpl : public Base {
  public:

@@ -16,12 +16,13 @@ class TARNIK_EXPORT Writer : public virtual Object {
   virtual void Write(std::string_view text) = 0;
 };
 
-/// A writer that keeps what was written.
+/// A writer that keeps everything written in memory, which is cleansed when the writer is
+/// destroyed.
 class TARNIK_EXPORT StringWriter : public Writer {
  public:
-  /// All that was written so far; valid until the next write.
+  /// Everything written so far; valid until the next write.
   virtual const std::string& Text() const = 0;
-  /// Hands over all that was written so far and leaves the writer empty.
+  /// Moves out everything written so far and leaves the writer empty.
   virtual std::string TakeText() = 0;
 };
 

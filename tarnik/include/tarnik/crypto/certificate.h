@@ -21,21 +21,23 @@ class TARNIK_EXPORT Certificate : public virtual Object {
   /// Distinguished names in the form of RFC 2253 (most specific part first).
   virtual const std::string& SubjectName() const = 0;
   virtual const std::string& IssuerName() const = 0;
-  /// Decimal.
+  /// The serial number in decimal.
   virtual const std::string& SerialNumber() const = 0;
   virtual System::DateTime NotBefore() const = 0;
   virtual System::DateTime NotAfter() const = 0;
   /// The SubjectKeyIdentifier extension; empty when there is none.
   virtual const std::vector<unsigned char>& SubjectKeyIdentifier() const = 0;
+  /// Throws `CryptoException` when the key cannot be decoded or is of an unknown kind.
   virtual Ref<const PublicKey> GetPublicKey() const = 0;
 };
 
-/// Decodes one certificate. A certificate that was decoded before is found again by its bytes.
-/// Throws `CryptoException` when the bytes are not exactly one certificate.
+/// Decodes one certificate. Certificates are cached by their bytes, so the result may be an object
+/// that was returned before. Throws `CryptoException` when the bytes are not exactly one
+/// certificate.
 TARNIK_EXPORT Ref<const Certificate> CreateCertificateFromDer(const unsigned char* bytes,
                                                               std::size_t length);
 /// Reads every CERTIFICATE block of a PEM text (RFC 7468), in order. Throws `CryptoException` when
-/// there is none or one is broken.
+/// there is none or one cannot be decoded.
 TARNIK_EXPORT std::vector<Ref<const Certificate>> CreateCertificatesFromPem(std::string_view pem);
 /// Reads a file of PEM certificates. Throws `IOException` when it cannot be read, else as above.
 TARNIK_EXPORT std::vector<Ref<const Certificate>> LoadCertificates(const std::string& path);

@@ -8,7 +8,7 @@
 
 namespace Tarnik::Crypto {
 
-/// A certificate or key that cannot be read or used, or a failure of the cryptographic library.
+/// A certificate or key that cannot be decoded or used, or a failure of the cryptographic library.
 class TARNIK_EXPORT CryptoException : public Exception {
  public:
   explicit CryptoException(std::string message,

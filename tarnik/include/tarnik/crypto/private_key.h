@@ -14,63 +14,64 @@
 
 namespace Tarnik::Crypto {
 
-/// A private key: something that can sign and answer TLS handshakes, but not be read. It may live
-/// in memory or in a device. Immutable; safe from many threads. Made by the functions below alone:
-/// what uses a key accepts no other implementation.
+/// A private key, which can sign and be used in TLS handshakes but not be read. It may be in memory
+/// or in a device. Immutable; safe from many threads. Created only by the functions below:
+/// functions that use a key accept no other implementation.
 class TARNIK_EXPORT PrivateKey : public virtual Object {
  public:
   /// The public half.
   virtual Ref<const PublicKey> GetPublicKey() const = 0;
-  /// True when this is the key that `certificate` was issued for. Throws `CryptoException` when
-  /// the certificate's public key is broken or of an unknown kind.
+  /// True when `certificate` was issued for this key. Throws `CryptoException` when
+  /// the certificate's public key cannot be decoded or is of an unknown kind.
   virtual bool Matches(const Certificate& certificate) const = 0;
 };
 
-/// Gives the passphrase of an encrypted key, or the PIN of a device: at most 1024 bytes; an empty
+/// Returns the passphrase of an encrypted key, or the PIN of a device: at most 1024 bytes; an empty
 /// one is tried like any other. It is called at most once for each load, on the thread of the load,
-/// and only if there is something to decrypt or unlock; the text that it returns is overwritten
-/// after use. What it throws passes through the load unchanged.
+/// and only if there is something to decrypt or unlock; the returned text is overwritten after use.
+/// Its exceptions pass through the load unchanged.
 ///
-/// How much work a passphrase takes to be tried stands in the encrypted key itself and is not
-/// limited here: keys of strangers may take very long.
+/// The encrypted key itself defines how much work it takes to try a passphrase. This is not
+/// limited: a key from an untrusted source may take very long.
 using PassphraseCallback = std::function<std::string()>;
 
-/// Reads the one private key of a PEM text (RFC 7468): PKCS#8 (RFC 5958), plain or encrypted, or
+/// Reads the only private key of a PEM text (RFC 7468): PKCS#8 (RFC 5958), plain or encrypted, or
 /// the traditional forms of RSA (RFC 8017, appendix A.1.2) and EC keys (RFC 5915), plain or
-/// encrypted by the rules of RFC 1421. Other blocks, such as certificates, are passed over. Nobody
-/// is ever asked for a passphrase but `passphrase`. `pem` stays with the caller, who may want to
+/// encrypted as in RFC 1421. Other blocks, such as certificates, are skipped. Passphrases are
+/// requested only from `passphrase`, never from a terminal. The caller keeps `pem` and may want to
 /// overwrite it (`StringUtil::Cleanse`).
 ///
 /// Throws `CryptoException` when there is no private key or more than one, when it is encrypted
-/// and there is no passphrase or a wrong one, and when it is broken or of an unknown kind.
+/// and there is no passphrase or a wrong one, and when it cannot be decoded or is of an unknown
+/// kind.
 TARNIK_EXPORT Ref<const PrivateKey> CreatePrivateKeyFromPem(
     std::string_view pem, const PassphraseCallback& passphrase = {});
-/// Reads a file of PEM. Throws `IOException` when it cannot be read, else as above.
+/// Reads a PEM file. Throws `IOException` when it cannot be read, else as above.
 TARNIK_EXPORT Ref<const PrivateKey> LoadPrivateKey(const std::string& path,
                                                    const PassphraseCallback& passphrase = {});
-/// Loads the one private key that `uri` names with OpenSSL's store: "file:" (RFC 8089), or any
-/// other scheme that a provider loaded into this process understands, such as "pkcs11:" (RFC 7512).
-/// A key that stays in a device is used there. Throws `CryptoException` when the URI has no scheme
-/// or one that nothing understands, and as above.
+/// Loads the only private key that `uri` names with OpenSSL's store: "file:" (RFC 8089), or another
+/// scheme that a provider loaded into this process supports, such as "pkcs11:" (RFC 7512). A key in
+/// a device stays there. Throws `CryptoException` when the URI has no scheme or an unsupported one,
+/// and as above.
 TARNIK_EXPORT Ref<const PrivateKey> LoadPrivateKeyFromUri(
     const std::string& uri, const PassphraseCallback& passphrase = {});
 
-/// A private key, the certificate that was issued for it, and the other certificates that came
-/// with them, in their order: usually the certificate's issuers.
+/// A private key, the certificate that was issued for it, and the other certificates of the same
+/// source in their order: usually the certificate's issuers.
 struct KeyAndCertificate {
   Ref<const PrivateKey> privateKey;
   Ref<const Certificate> certificate;
   std::vector<Ref<const Certificate>> chain;
 };
 
-/// Reads a PKCS#12 (RFC 7292) with a MAC. It must hold one private key and that key's certificate.
-/// The passphrase, which may not hold a NUL, is asked for unless the empty one fits. Throws
-/// `CryptoException` when a key or a certificate is missing, no certificate belongs to the key,
-/// there are several keys, the passphrase is wrong or there is none, there is no MAC, or the bytes
-/// are broken or protected by an algorithm that is not available.
+/// Reads a PKCS#12 (RFC 7292) with a MAC. It must contain one private key and that key's
+/// certificate. The passphrase, which must not contain a NUL, is requested unless the empty one is
+/// correct. Throws `CryptoException` when a key or a certificate is missing, no certificate belongs
+/// to the key, there are several keys, the passphrase is wrong or missing, there is no MAC, or the
+/// bytes cannot be decoded or are protected with an algorithm that is not available.
 TARNIK_EXPORT KeyAndCertificate CreateKeyAndCertificateFromPkcs12(
     const unsigned char* bytes, std::size_t length, const PassphraseCallback& passphrase = {});
-/// Reads a file of PKCS#12. Throws `IOException` when it cannot be read, else as above.
+/// Reads a PKCS#12 file. Throws `IOException` when it cannot be read, else as above.
 TARNIK_EXPORT KeyAndCertificate LoadKeyAndCertificate(const std::string& path,
                                                       const PassphraseCallback& passphrase = {});
 

@@ -8,11 +8,12 @@ namespace Tarnik::Crypto {
 
 enum class KeyAlgorithm { kRsa, kRsaPss, kEc, kOther };
 
-/// A public key. Immutable; safe from many threads. Made by `Certificate::GetPublicKey`.
+/// A public key. Immutable; safe from many threads. Returned by `Certificate::GetPublicKey` and
+/// `PrivateKey::GetPublicKey`.
 class TARNIK_EXPORT PublicKey : public virtual Object {
  public:
   virtual KeyAlgorithm Algorithm() const noexcept = 0;
-  /// Size in bits: of the modulus for RSA, of the order for EC.
+  /// The size in bits of the modulus (RSA) or of the order (EC).
   virtual int Bits() const noexcept = 0;
 };
 

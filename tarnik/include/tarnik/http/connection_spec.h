@@ -11,7 +11,7 @@
 
 namespace Tarnik::Http {
 
-/// Where and how a user agent connects. Immutable; safe from many threads.
+/// Defines where and how a user agent connects. Immutable; safe from many threads.
 class TARNIK_EXPORT ConnectionSpec : public virtual Object {};
 
 /// A connection spec that opens its streams itself. The order of the virtual functions is part of
@@ -20,17 +20,17 @@ class TARNIK_EXPORT CustomConnectionSpec : public ConnectionSpec {
  public:
   using ConnectCompletion = std::function<void(System::Stream*, Exception*)>;
 
-  /// The host of the service, as the Host header names it.
+  /// The host of the service for the Host header.
   virtual std::string Host() const = 0;
-  /// The host that cookies belong to.
+  /// The host whose cookies are used.
   virtual std::string CookieHost() const = 0;
-  /// Names the place in messages and tells the connections of this spec apart: "host:port". The
-  /// port becomes part of the Host header, unless it is the scheme's own.
+  /// "host:port". Names the endpoint in messages and distinguishes the connections of this spec.
+  /// The port becomes part of the Host header, unless it is the default port of the scheme.
   virtual std::string EndpointKey() const = 0;
-  /// True when requests name the whole URL because they go to a proxy.
+  /// True when requests go to a proxy and therefore contain the whole URL.
   virtual bool IsProxy() const = 0;
   /// Opens a stream. The completion runs once, on an I/O thread: with the stream and null, or with
-  /// an exception that decides, whatever the stream.
+  /// an exception, in which case any stream is closed.
   virtual Ref<System::CancellableItem> StartConnect(ConnectCompletion completion) = 0;
 };
 

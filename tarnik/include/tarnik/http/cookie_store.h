@@ -10,16 +10,16 @@
 
 namespace Tarnik::Http {
 
-/// Cookies in memory (RFC 6265). Safe from many threads. Holds at most 50 cookies of 4096 bytes a
-/// host and 300 in all; the oldest go first.
+/// Cookies in memory (RFC 6265). Safe from many threads. Stores at most 50 cookies per domain and
+/// 300 in total, of at most 4096 bytes each; the oldest are removed first.
 class TARNIK_EXPORT CookieStore : public virtual Object {
  public:
-  /// Takes a Set-Cookie header that `host` answered to a request for `path`. What RFC 6265
-  /// section 5.3 says to ignore is ignored: another domain, control characters, a name-less cookie,
-  /// a Secure one over plain HTTP.
+  /// Stores the cookie of a Set-Cookie header that `host` sent in the answer to a request for
+  /// `path`. Cookies are ignored as RFC 6265, section 5.3 says: of another domain, with control
+  /// characters, without a name, or Secure cookies over plain HTTP.
   virtual void Store(std::string_view host, std::string_view path, bool isSecure,
                      std::string_view setCookie, const System::DateTime& now) = 0;
-  /// The Cookie header for a request (RFC 6265 section 5.4); empty when there is nothing to send.
+  /// The Cookie header for a request (RFC 6265, section 5.4); empty when there is nothing to send.
   virtual std::string HeaderFor(std::string_view host, std::string_view path, bool isSecure,
                                 const System::DateTime& now) = 0;
 };

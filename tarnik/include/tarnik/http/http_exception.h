@@ -8,7 +8,7 @@
 
 namespace Tarnik::Http {
 
-/// An HTTP exchange that broke the protocol or a limit.
+/// An HTTP exchange that violated the protocol or a limit.
 class TARNIK_EXPORT HttpException : public IOException {
  public:
   explicit HttpException(std::string message,

@@ -10,21 +10,21 @@ namespace Tarnik::Http {
 
 enum class Method { GET, POST };
 
-/// A request to be sent once. Used by one thread at a time until it is sent. Its body is cleansed
-/// from memory when it dies.
+/// A request that is sent once. Used by one thread at a time until it is sent. Its body is cleansed
+/// from memory when it is destroyed.
 class TARNIK_EXPORT ClientRequest : public virtual Object {
  public:
-  /// Sets a header, replacing one of the same name (without regard to case) in its place. Throws
-  /// `InvalidArgumentException` when the name is not a token or the value holds control characters
-  /// (RFC 9110, section 5), and for headers that the agent writes itself: Host, Content-Length,
-  /// Transfer-Encoding, Connection, Cookie.
+  /// Sets a header; one of the same name (without regard to case) is replaced and keeps its
+  /// position. Throws `InvalidArgumentException` when the name is not a token or the value contains
+  /// control characters (RFC 9110, section 5), and for headers that the agent writes itself: Host,
+  /// Content-Length, Transfer-Encoding, Connection, Cookie.
   virtual void SetHeader(const std::string& name, const std::string& value) = 0;
-  /// Collects the body.
+  /// The writer of the body.
   virtual Ref<Writer> BodyWriter() = 0;
 };
 
-/// Throws `InvalidArgumentException` when `target` is empty or holds blanks, control characters or
-/// non-ASCII bytes.
+/// Throws `InvalidArgumentException` when `target` is empty or contains blanks, control characters
+/// or non-ASCII bytes.
 TARNIK_EXPORT void CreateHttpRequest(Method method, const std::string& target,
                                      Ref<ClientRequest>& request);
 

@@ -14,7 +14,7 @@ struct StatusLine {
   std::string reason;  ///< may be empty
 };
 
-/// A whole answer. Immutable, but for its body, which is read once.
+/// A complete answer. Immutable except for its body, which is read once.
 class TARNIK_EXPORT ClientResponse : public virtual Object {
  public:
   virtual const StatusLine& Status() const = 0;

@@ -9,14 +9,14 @@
 namespace Tarnik::Http {
 
 /// Splits an absolute http or https URL (RFC 3986; RFC 9110, section 4.2). `host` is a name, an
-/// IPv4 address, or an IPv6 address without its brackets; `port` is the one written or 80 or 443;
-/// `path` is the request target: path and query, "/" if the URL has none.
+/// IPv4 address, or an IPv6 address without its brackets; `port` is the port of the URL, or 80 or
+/// 443 if it has none; `path` is the request target: path and query, "/" if the URL has no path.
 ///
-/// Throws `InvalidArgumentException`, naming the fault but not the URL, for another scheme, a
-/// missing or malformed host (a name that a resolver would take for a number included), a port
-/// outside 1 to 65535, user information, a fragment, blanks, control characters or non-ASCII bytes,
-/// characters that must be percent-encoded, and malformed percent escapes; the outputs are then
-/// unchanged.
+/// Throws `InvalidArgumentException`, whose message contains the fault but not the URL, for another
+/// scheme, a missing or malformed host (including a name that a resolver would read as a number), a
+/// port outside 1 to 65535, user information, a fragment, blanks, control characters or non-ASCII
+/// bytes, characters that must be percent-encoded, and malformed percent escapes; the outputs are
+/// then unchanged.
 TARNIK_EXPORT void ParseHttpURL(std::string_view url, bool& isHttps, std::string& host, int& port,
                                 std::string& path);
 

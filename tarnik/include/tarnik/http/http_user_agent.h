@@ -14,30 +14,30 @@
 
 namespace Tarnik::Http {
 
-/// What an answer may hold.
+/// Limits of an answer.
 inline constexpr std::size_t kMaxHeaderBytes = std::size_t{64} * 1024;
 inline constexpr std::size_t kMaxBodyBytes = std::size_t{16} * 1024 * 1024;
 
-/// An exchange under way. `Cancel` closes its connection; the completion then gets a
-/// `CancelledException`. False from `Cancel` when the exchange had ended before.
+/// An exchange under way. `Cancel` closes its connection, and the completion then receives a
+/// `CancelledException`. `Cancel` returns false when the exchange had ended before.
 class TARNIK_EXPORT PendingRequestItem : public System::CancellableItem {};
 
-/// Keeps idle connections for later requests: at most 8 to one place and 64 in all, each for at
-/// most 5 seconds. Several agents may share one; only agents of the same spec object share
-/// connections, since another spec may trust other peers. Closes its idle connections when it dies.
-/// Safe from many threads.
+/// Keeps idle connections for later requests: at most 8 to one endpoint and 64 in total, each for
+/// at most 5 seconds. Several agents may share a pool, but only agents with the same spec object
+/// share connections, since another spec may trust other peers. The pool closes its idle
+/// connections when it is destroyed. Safe from many threads.
 class TARNIK_EXPORT ConnectionPool : public virtual Object {};
 
 TARNIK_EXPORT Ref<ConnectionPool> CreateConnectionPool();
 
-/// Sends HTTP/1.1 requests (RFC 9112) to one endpoint. Safe from many threads; each exchange under
-/// way has a connection of its own, and connections are kept for the next one while the agent (or
-/// the pool that it was given) lives. No redirect is followed, no content coding is asked for, and
-/// no request is ever sent twice: when the peer closes a kept connection at the very moment of the
+/// Sends HTTP/1.1 requests (RFC 9112) to one endpoint. Safe from many threads. Each exchange under
+/// way has a separate connection, and connections are kept for later exchanges while the agent (or
+/// the pool that it was given) exists. Redirects are not followed, no content coding is requested,
+/// and no request is ever sent twice: when the peer closes an idle connection at the moment of the
 /// next request, that exchange fails (RFC 9110, section 9.2.2).
 ///
-/// An answer fails with `HttpException` when it breaks RFC 9112, could be read in more than one
-/// way, exceeds a limit, or is cut off; a stream's failure is reported as the stream reported it.
+/// An exchange fails with `HttpException` when the answer violates RFC 9112, is ambiguous, exceeds
+/// a limit, or is cut off; failures of the stream are reported unchanged.
 class TARNIK_EXPORT UserAgent : public virtual Object {
  public:
   using Completion = std::function<void(Exception*, ClientResponse*, PendingRequestItem*)>;
@@ -45,8 +45,8 @@ class TARNIK_EXPORT UserAgent : public virtual Object {
   /// Sends `request` and returns at once. The completion runs exactly once, on an I/O thread, with
   /// exactly one of exception and response; both are valid only during the call. It must not block,
   /// and an exception that leaves it ends the process, as on any thread. When `timeoutMicroseconds`
-  /// is not 0 and that time passes first, the exchange ends with a `TimeoutException`; the limit
-  /// covers everything from the call to the last byte of the answer.
+  /// is not 0 and that time passes first, the exchange ends with a `TimeoutException`; the time is
+  /// measured from the call to the last byte of the answer.
   ///
   /// Throws `InvalidArgumentException` for a null request, an empty completion or a spec whose host
   /// is neither a name nor an address, `InvalidStateException` for a request that was sent before,
@@ -55,16 +55,16 @@ class TARNIK_EXPORT UserAgent : public virtual Object {
                                             unsigned long timeoutMicroseconds) = 0;
 
   /// Waits until the exchange has ended and its completion has run, and returns its response or
-  /// throws its exception. When `timeoutMicroseconds` is not 0 and that time passes first, cancels
-  /// the exchange, which then ends with the `TimeoutException` that is thrown. May be called again.
-  /// Not to be called on an I/O thread, completions included. Throws `TypeMismatchException` for an
-  /// item that no agent of this library has made.
+  /// throws its exception. When `timeoutMicroseconds` is not 0 and that time passes first, the
+  /// exchange is cancelled and ends with the `TimeoutException` that is thrown. May be called
+  /// several times. Must not be called on an I/O thread, including from a completion. Throws
+  /// `TypeMismatchException` for an item that was not created by an agent of this library.
   virtual Ref<ClientResponse> Wait(PendingRequestItem* item, unsigned long timeoutMicroseconds) = 0;
 };
 
-/// An agent that connects through `spec`, a `CustomConnectionSpec` (`TypeMismatchException` for
-/// anything else). `cookies` may be null (no cookies). Without a `pool` the agent keeps its idle
-/// connections to itself.
+/// An agent that connects through `spec`. Throws `TypeMismatchException` unless `spec` is a
+/// `CustomConnectionSpec`. `cookies` may be null for no cookies. If `pool` is null, the agent uses
+/// a pool of its own.
 TARNIK_EXPORT Ref<UserAgent> CreateHttpUserAgent(ConnectionSpec* spec, CookieStore* cookies,
                                                  ConnectionPool* pool);
 

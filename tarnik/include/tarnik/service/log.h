@@ -11,12 +11,12 @@
 
 namespace Tarnik::Service {
 
-/// A named logger, made once and never destroyed before the process ends. A line of level L is
-/// written when the logger's level is at least L. Levels run from 0 (silence) to 9 (everything);
-/// a new logger has level 4: 1 fatal, 2 error, 3 failure of one request, 4 warning, 5 notice,
-/// 6 information, 7 trace of operations, 8 and 9 detail.
+/// A named logger, created once and not destroyed before the process ends. A line of level L is
+/// written when the logger's level is at least L. Levels range from 0 (silence) to 9 (everything);
+/// a new logger has level 4. The levels are 1 fatal, 2 error, 3 failure of one request, 4 warning,
+/// 5 notice, 6 information, 7 trace of operations, 8 and 9 detail.
 ///
-/// Loggers of one name share one level. Safe from any thread.
+/// Loggers of the same name share one level. Safe from any thread.
 class TARNIK_EXPORT StaticLogger {
  public:
   /// `name` must live as long as the process (a literal).
@@ -41,7 +41,7 @@ class TARNIK_EXPORT StaticLogger {
 TARNIK_EXPORT void LogInternal(const StaticLogger& logger, int level, std::string_view format,
                                std::initializer_list<PrintFormatter> arguments) noexcept;
 
-/// Sets the level of the logger `name`, also when it is made only later. Throws
+/// Sets the level of the logger `name`, which may be created later. Throws
 /// `InvalidArgumentException` unless `level` is 0 to 9.
 TARNIK_EXPORT void SetLogLevel(std::string_view name, int level);
 
@@ -52,11 +52,11 @@ struct LogRecord {
   std::string_view text;
 };
 
-/// Receives every line that passes its logger's level; called on the thread that logs, possibly
-/// from several at once.
+/// Receives every line that its logger's level allows; called on the thread that logs, possibly
+/// from several threads at once.
 using LogSink = std::function<void(const LogRecord&)>;
 
-/// Sends all lines to `sink` from now on; an empty one brings back the default, which writes time,
+/// Sends all lines to `sink` from now on; an empty sink restores the default, which writes time,
 /// level, logger and text to the standard error stream.
 TARNIK_EXPORT void SetLogSink(LogSink sink);
 

@@ -12,56 +12,58 @@
 
 namespace Tarnik::Ssl {
 
-/// A TLS connection over another stream. `Close` closes the stream below. A read that meets the end
-/// of the stream below without the peer's close_notify fails with an `SSLException`: cut-off data
-/// is never taken for all of it (RFC 8446, section 6.1).
+/// A TLS connection over another stream. `Close` closes the stream below. When the stream below
+/// ends without the peer's close_notify, a read fails with an `SSLException`, so that truncated
+/// data is never taken for complete data (RFC 8446, section 6.1).
 class TARNIK_EXPORT SSLStream : public System::Stream {
  public:
   using HandshakeCompletion = std::function<void(Exception* error)>;
 
   /// Runs the client's side of the handshake. The peer must present a certificate that the context
-  /// trusts and that names `serverName`, or `host` if `serverName` is empty: a DNS name or an IP
-  /// address of its subjectAltName (RFC 6125; the subject's common name does not count). A name,
-  /// not an address, is sent as SNI. Called once, before any read or write.
+  /// trusts and whose subjectAltName contains `serverName`, or `host` if `serverName` is empty, as
+  /// a DNS name or an IP address (RFC 6125; the common name of the subject does not count). A name,
+  /// but not an address, is sent as SNI. Called once, before any read or write.
   virtual void HandshakeClientAsync(const std::string& host, const std::string& serverName,
                                     HandshakeCompletion completion) = 0;
 };
 
-/// Trust and sessions shared by TLS connections. Immutable; safe from many threads. TLS 1.2 and 1.3
-/// only. Sessions are resumed towards the same host, port-independent, and server name alone.
+/// Trust and sessions shared by TLS connections. Immutable; safe from many threads. Supports
+/// TLS 1.2 and 1.3. Sessions are resumed only with the same host, on any port, and the same server
+/// name.
 class TARNIK_EXPORT SSLContext : public virtual Object {
  public:
   /// A TLS stream over `stream`. `name` is a label for diagnostics and may be empty.
   virtual Ref<SSLStream> WrapStream(System::Stream* stream, const std::string& name) = 0;
 };
 
-/// Whom to trust, and who to be. With nothing set, no peer is trusted and no certificate is shown.
+/// The trusted peers and the identity of the client. By default no peer is trusted and no
+/// certificate is presented.
 struct SSLContextConfig {
-  /// Files of PEM CA certificates.
+  /// PEM files of CA certificates.
   std::vector<std::string> caFiles;
-  /// Folders of CA certificates under their subject hash names.
+  /// Folders of CA certificates whose file names are the hashes of their subjects.
   std::vector<std::string> caFolders;
   /// CA certificates in memory.
   std::vector<Ref<const Crypto::Certificate>> caCertificates;
   /// Trust the CAs of the operating system.
   bool useSystemStore = false;
-  /// Files of PEM certificate revocation lists. If any is given, every certificate of a peer's
-  /// chain is checked, and one whose issuer's list is missing or out of date is refused.
+  /// PEM files of certificate revocation lists. If there is any, every certificate of a peer's
+  /// chain is checked, and a certificate whose issuer's list is missing or out of date is refused.
   std::vector<std::string> crlFiles;
-  /// If not empty, the peer's own certificate must also equal one of these byte for byte.
+  /// If not empty, the peer's certificate must also equal one of these byte for byte.
   std::vector<Ref<const Crypto::Certificate>> pinnedCertificates;
-  /// Shown to a peer that asks for a certificate, with proof that `clientPrivateKey` is at hand.
-  /// Both are set or neither. A key in a device serves here only if its provider gives the public
-  /// half to no other provider: TLS would try to sign with that.
+  /// Presented to a peer that requests a certificate, with a signature by `clientPrivateKey`. Both
+  /// are set or neither. A key in a device can be used only if its provider does not export the
+  /// public half to another provider, since OpenSSL would then try to sign with that provider.
   Ref<const Crypto::Certificate> clientCertificate;
   Ref<const Crypto::PrivateKey> clientPrivateKey;
-  /// Sent behind `clientCertificate`: its issuers, each behind the one that it has issued.
+  /// Sent after `clientCertificate`: its issuers, each after the certificate that it issued.
   std::vector<Ref<const Crypto::Certificate>> clientCertificateChain;
 };
 
-/// Throws `SSLException` when something that `config` names cannot be loaded (naming the file), and
-/// when the client's key does not belong to its certificate, one of them is set without the other,
-/// or TLS cannot use them; `InvalidArgumentException` when a certificate of a list is null.
+/// Throws `SSLException` when a file or folder of `config` cannot be loaded (the message names it),
+/// and when the client's key does not belong to its certificate, one of them is set without the
+/// other, or TLS cannot use them; `InvalidArgumentException` when a certificate in a list is null.
 TARNIK_EXPORT Ref<SSLContext> CreateSSLContext(const SSLContextConfig& config);
 
 }  // namespace Tarnik::Ssl

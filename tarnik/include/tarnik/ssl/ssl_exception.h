@@ -8,7 +8,8 @@
 
 namespace Tarnik::Ssl {
 
-/// A TLS set-up, handshake or record that failed. The message names the peer and the cause.
+/// A failure of TLS configuration, of a handshake or of a connection. The message names the cause
+/// and, once there is one, the peer.
 class TARNIK_EXPORT SSLException : public IOException {
  public:
   explicit SSLException(std::string message,

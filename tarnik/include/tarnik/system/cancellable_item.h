@@ -8,15 +8,16 @@
 
 namespace Tarnik::System {
 
-/// A handle to something under way that can be called off. Safe from any thread.
+/// A handle to an operation under way that can be cancelled. Safe from any thread.
 class TARNIK_EXPORT CancellableItem : public virtual Object {
  public:
-  /// Calls it off; true when the cancellation was carried out. The operation's completion still
-  /// runs, with a `CancelledException` unless it had already ended.
+  /// Cancels the operation; true when it was cancelled. The operation's completion still runs, with
+  /// a `CancelledException` unless the operation had already ended.
   virtual bool Cancel() = 0;
 };
 
-/// An item whose `Cancel` runs `cancel`, each time that it is called.
+/// An item whose `Cancel` calls `cancel` every time. Throws `InvalidArgumentException` when
+/// `cancel` is empty.
 TARNIK_EXPORT Ref<CancellableItem> CreateCancellableItem(std::function<bool()> cancel);
 
 }  // namespace Tarnik::System

@@ -8,12 +8,11 @@
 
 namespace Tarnik::System {
 
-/// An instant on the UTC time line in microseconds since 1970-01-01T00:00:00Z, with the offset of
-/// the zone in which its calendar fields are told. Immutable value; comparisons look at the instant
-/// alone.
+/// An instant on the UTC time line in microseconds since 1970-01-01T00:00:00Z, with the UTC offset
+/// of the zone of its calendar fields. An immutable value; comparisons use only the instant.
 ///
 /// The range is 0001-01-01T00:00:00.000000Z to 9999-12-31T23:59:59.999999Z, the years that XML
-/// Schema dateTime writes in four digits; instants beyond it are moved to its nearest end.
+/// Schema dateTime writes in four digits; instants outside of it are set to its nearest end.
 class TARNIK_EXPORT DateTime {
  public:
   /// 1970-01-01T00:00:00Z.
@@ -22,18 +21,18 @@ class TARNIK_EXPORT DateTime {
   /// Reads the XML Schema dateTime form (XML Schema Part 2, section 3.2.7):
   /// "YYYY-MM-DDThh:mm:ss[.fraction][Z|(+|-)hh:mm]".
   ///
-  /// A time without a zone is UTC (SAML 2.0 core, section 1.3.3). Digits of the fraction beyond the
-  /// sixth are cut off. 24:00:00 is midnight of the next day. Refused with
-  /// `DateTimeFormatException`: years before 0001 or after 9999, leap seconds, zones beyond 14:00,
-  /// lower-case letters, white space, and anything else that the form does not hold.
+  /// A time without a zone is UTC (SAML 2.0 Core, section 1.3.3). Digits of the fraction after the
+  /// sixth are ignored. 24:00:00 is midnight of the next day. Throws `DateTimeFormatException` for
+  /// years before 0001 or after 9999, leap seconds, zones beyond 14:00, lower-case letters, white
+  /// space, and anything else that is not of this form.
   static DateTime Parse(std::string_view text);
 
   /// Microseconds since 1970-01-01T00:00:00Z.
   long GetUtcTime() const noexcept { return utcMicroseconds_; }
-  /// Minutes that the zone of the calendar fields is ahead of UTC, -840 to 840.
+  /// The minutes by which the zone of the calendar fields is ahead of UTC, -840 to 840.
   int Bias() const noexcept { return biasMinutes_; }
 
-  /// Calendar fields (proleptic Gregorian) in this value's zone.
+  /// The calendar fields (proleptic Gregorian) in the zone of this value.
   struct Fields {
     int century;        ///< 0 to 99: the year divided by 100
     int yearOfCentury;  ///< 0 to 99
@@ -73,14 +72,14 @@ class TARNIK_EXPORT DateTime {
   int biasMinutes_ = 0;
 };
 
-/// The instant `utcMicroseconds` after 1970-01-01T00:00:00Z, its fields told in UTC, or in the
+/// The instant `utcMicroseconds` after 1970-01-01T00:00:00Z, with its fields in UTC, or in the
 /// process's local zone if `inLocalZone`.
 TARNIK_EXPORT DateTime DateTimeFromUtc(long utcMicroseconds, bool inLocalZone);
 
-/// The system clock's time now, told in UTC.
+/// The current time of the system clock, with its fields in UTC.
 TARNIK_EXPORT DateTime GetUtcDateTime();
 
-/// `a + b` and `a * b` that stop at the ends of the 64-bit range instead of overflowing.
+/// `a + b` and `a * b`, limited to the 64-bit range instead of overflowing.
 TARNIK_EXPORT long SaturatingAdd(long a, long b) noexcept;
 TARNIK_EXPORT long SaturatingMultiply(long a, long b) noexcept;
 

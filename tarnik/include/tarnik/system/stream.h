@@ -11,22 +11,22 @@ namespace Tarnik::System {
 
 /// A two-way stream of bytes, driven by completions.
 ///
-/// At most one read and one write may be under way at once. Buffers stay the caller's and must live
-/// until the completion has run. Each completion runs exactly once, on an I/O thread of the pool
-/// and never inside the call that started the operation; it must not block. The exception is null
-/// on success and valid only during the call. The stream keeps itself alive while an operation is
-/// under way.
+/// At most one read and one write may be under way at once. The caller owns the buffers and must
+/// keep them alive until the completion has run. Each completion runs exactly once, on an I/O
+/// thread of the pool and never inside the call that started the operation; it must not block. The
+/// exception is null on success and valid only during the call. The stream keeps itself alive while
+/// an operation is under way.
 class TARNIK_EXPORT Stream : public virtual Object {
  public:
   using ReadCompletion = std::function<void(std::size_t bytesRead, Exception* error)>;
   using WriteCompletion = std::function<void(Exception* error)>;
 
-  /// Reads at least one and at most `size` bytes. Zero bytes without an error is the orderly end of
-  /// the stream.
+  /// Reads at least one and at most `size` bytes. Zero bytes without an error mean the orderly
+  /// end of the stream.
   virtual void ReadAsync(char* buffer, std::size_t size, ReadCompletion completion) = 0;
   /// Writes all `size` bytes.
   virtual void WriteAsync(const char* data, std::size_t size, WriteCompletion completion) = 0;
-  /// Closes at once, without a farewell to the peer. Operations under way complete with a
+  /// Closes at once, without notifying the peer. Operations under way complete with a
   /// `CancelledException`. Safe from any thread, any number of times.
   virtual void Close() noexcept = 0;
 };

@@ -11,20 +11,20 @@
 
 namespace Tarnik::System {
 
-/// A TCP connection that this side opens.
+/// A TCP connection that is opened by this side.
 class TARNIK_EXPORT TCPClientSocket : public Stream {
  public:
   using ConnectCompletion = std::function<void(TCPClientSocket*, Exception*)>;
 
   /// Resolves `host` (a name or a literal IPv4 or IPv6 address, without brackets) and connects to
-  /// `port`, trying each of its addresses in turn. The completion gets this socket and null, or
+  /// `port`, trying each of its addresses in turn. The completion receives this socket and null, or
   /// this socket and an `IOException` that names host, port and the last cause, or a
   /// `CancelledException` after `Close`. Called once per socket.
   ///
-  /// Throws `InvalidArgumentException` when `host` can be no host's name (empty, too long, blanks,
+  /// Throws `InvalidArgumentException` when `host` cannot be a host name (empty, too long, blanks,
   /// control characters, brackets, ...) or `port` is not 1 to 65535, and `InvalidStateException`
-  /// when the socket was told to connect before. Reads and writes throw `InvalidStateException`
-  /// before the connection stands and while another of their kind is under way.
+  /// when this function was called before. Reads and writes throw `InvalidStateException` before
+  /// the connection is established and while another operation of their kind is under way.
   virtual void ConnectAsync(const std::string& host, int port, ConnectCompletion completion) = 0;
 };
 

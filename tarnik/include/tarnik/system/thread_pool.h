@@ -9,34 +9,34 @@
 
 namespace Tarnik::System {
 
-/// The process's threads: a few I/O threads that run completions, and an elastic set of worker
+/// The threads of the process: a few I/O threads that run completions, and an elastic set of worker
 /// threads that run work items and may block.
 ///
 /// Worker threads are added while all are busy, up to `kMaxWorkers`; further items queue in order.
-/// Idle workers end after ten seconds. Safe from any thread. Threads of the pool run none of the
-/// host's signal handlers.
+/// Idle workers end after ten seconds. Safe from any thread. Threads of the pool do not run the
+/// host program's signal handlers.
 ///
-/// Process exit with work under way is safe. From then on nothing is started, timers included;
-/// `exit` waits up to 200 ms for the completions and items that are running, and goes on without
-/// those that have not ended, so that a blocked item cannot hold the process up. A child that was
-/// forked off has none of the pool's threads and must not use the pool before it calls `exec`.
+/// The process may exit while work is under way. From then on nothing is started, timers included;
+/// `exit` waits up to 200 ms for the completions and items that are running, and then continues
+/// without those that have not ended, so that a blocked item cannot block the exit. A forked child
+/// process has none of the pool's threads and must not use the pool before it calls `exec`.
 class TARNIK_EXPORT ThreadPool : public virtual Object {
  public:
   static constexpr int kMaxWorkers = 256;
 
   /// Runs `item` on a worker thread. An exception that leaves the item ends the process, as on any
-  /// thread. Throws `InvalidArgumentException` when `item` is empty (so do the two below), and
-  /// `std::system_error` when there is no worker and the system has no thread to give.
+  /// thread. Throws `InvalidArgumentException` when `item` is empty (as do `Post` and `RunAfter`),
+  /// and `std::system_error` when there is no worker and the system cannot create a thread.
   virtual void Run(std::function<void()> item) = 0;
   /// Runs `completion` on an I/O thread, never inside this call; it must not block.
   virtual void Post(std::function<void()> completion) = 0;
-  /// Runs `completion` on an I/O thread after `microseconds`, unless the item returned is cancelled
-  /// before; a cancelled completion never runs.
+  /// Runs `completion` on an I/O thread after `microseconds`, unless the returned item is cancelled
+  /// first; a cancelled completion never runs.
   virtual Ref<CancellableItem> RunAfter(unsigned long microseconds,
                                         std::function<void()> completion) = 0;
 };
 
-/// The one pool of the process, started with its first use.
+/// The only pool of the process, which is started on first use.
 TARNIK_EXPORT Ref<ThreadPool> GetThreadPool();
 
 }  // namespace Tarnik::System

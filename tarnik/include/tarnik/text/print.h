@@ -12,10 +12,10 @@
 
 namespace Tarnik {
 
-/// One argument of a format: any value, turned into text when the formatter is made.
+/// One argument of a format. Its value is converted to text by the constructor.
 ///
-/// Booleans print as "true" and "false", integers in decimal, pointers in hexadecimal behind "0x",
-/// date-times in their `DateTime::ToString` form, texts as they are.
+/// Booleans print as "true" and "false", integers in decimal, pointers in hexadecimal after "0x",
+/// date-times in their `DateTime::ToString` form, and texts unchanged.
 class TARNIK_EXPORT PrintFormatter {
  public:
   PrintFormatter(std::string text) : text_(std::move(text)) {}
@@ -38,7 +38,7 @@ class TARNIK_EXPORT PrintFormatter {
   std::string text_;
 };
 
-/// A date-time in the form for people: "2024-03-05 07:08:09.010 UTC", milliseconds always shown.
+/// A date-time in a readable form: "2024-03-05 07:08:09.010 UTC", milliseconds always shown.
 class TARNIK_EXPORT DatePrintFormatter : public PrintFormatter {
  public:
   explicit DatePrintFormatter(const System::DateTime& time);
@@ -46,8 +46,8 @@ class TARNIK_EXPORT DatePrintFormatter : public PrintFormatter {
 
 namespace Detail {
 
-/// `format` with each "%N" (N from 1) replaced by argument N. Arguments are not scanned again; a
-/// percent sign without the number of an argument behind it stays as it is.
+/// Returns `format` with each "%N" (N from 1) replaced by argument N. Arguments are not scanned for
+/// placeholders. A percent sign that the number of an argument does not follow is kept.
 TARNIK_EXPORT std::string ASPrintInternal(std::string_view format,
                                           std::initializer_list<PrintFormatter> arguments);
 

@@ -11,10 +11,10 @@ namespace Tarnik::Xml {
 class TARNIK_EXPORT TextNode final : public Node {
  public:
   std::string_view Text() const noexcept { return {text_, length_}; }
-  /// True when a CDATA section, be it an empty one, is part of the text in the parsed document.
+  /// True when the text contains a CDATA section, possibly an empty one, in the parsed document.
   bool HasCDataSection() const noexcept { return hasCDataSection_ != 0; }
-  /// Sets the text, which has no CDATA section. Throws `InvalidArgumentException` for what XML 1.0
-  /// cannot carry (section 2.2).
+  /// Sets the text, which then has no CDATA section. Throws `InvalidArgumentException` for text
+  /// that XML 1.0 does not allow (section 2.2).
   void SetText(std::string_view text);
 
  private:
@@ -52,7 +52,7 @@ class TARNIK_EXPORT ProcessingInstructionNode final : public Node {
   std::size_t length_ = 0;
 };
 
-/// Makes an empty text node.
+/// Creates an empty text node.
 TARNIK_EXPORT void CreateTextNode(Ref<TextNode>& text);
 
 }  // namespace Tarnik::Xml

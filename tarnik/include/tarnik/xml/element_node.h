@@ -29,7 +29,7 @@ class QualifiedName {
   std::size_t prefixLength_ = 0;
 };
 
-/// An attribute, namespace declarations included: these are attributes named "xmlns" or "xmlns:p".
+/// An attribute. Namespace declarations are attributes named "xmlns" or "xmlns:p".
 class TARNIK_EXPORT Attribute {
  public:
   std::string_view Name() const noexcept { return Qualified().Full(); }
@@ -57,33 +57,33 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
   /// The namespace bound to the element's prefix here; empty when there is none.
   std::string_view NamespaceUri() const noexcept;
 
-  /// The namespace bound to `prefix` in scope at this element (Namespaces in XML 1.0, section 6);
-  /// the empty prefix asks for the default namespace. None when nothing binds it; an empty text
-  /// when the default namespace is undeclared with xmlns="". "xml" is always bound.
+  /// The namespace that is bound to `prefix` at this element (Namespaces in XML 1.0, section 6);
+  /// the empty prefix means the default namespace. Nothing when the prefix is not bound; an empty
+  /// text when the default namespace is undeclared with xmlns="". "xml" is always bound.
   std::optional<std::string_view> LookupNamespace(std::string_view prefix) const noexcept;
 
-  /// The next element in document order (XML Path Language 1.0, section 5) that stands in `top`:
-  /// the first one in this element or else the next one behind it; null after the last. `top` is
-  /// this element or one that holds it, or null for the whole tree. Steps through deep trees
-  /// without recursion.
+  /// The next element in document order (XML Path Language 1.0, section 5) inside `top`: the first
+  /// one in this element or else the next one after it; null after the last one. `top` is this
+  /// element or one that contains it, or null for the whole tree. Works without recursion, however
+  /// deep the tree is.
   ElementNode* NextElement(const ElementNode* top) const noexcept;
 
   std::size_t AttributeCount() const noexcept;
   /// Attribute `index`, from 0.
   const Attribute& AttributeAt(std::size_t index) const noexcept;
-  /// The value of the attribute with this qualified name, or none.
+  /// The value of the attribute with this qualified name, or nothing.
   std::optional<std::string_view> FindAttribute(std::string_view qualifiedName) const noexcept;
-  /// The value of the attribute with this expanded name, or none; the empty namespace finds
+  /// The value of the attribute with this expanded name, or nothing; the empty namespace finds
   /// attributes without a prefix.
   std::optional<std::string_view> FindAttribute(std::string_view namespaceUri,
                                                 std::string_view localName) const noexcept;
 
   /// Sets an attribute by its qualified name: a new one is added last, an existing one keeps its
-  /// place. Throws `InvalidArgumentException` when the name is not a qualified name or the value
-  /// holds what XML 1.0 cannot carry (section 2.2: control characters, broken UTF-8, U+FFFE,
+  /// position. Throws `InvalidArgumentException` when the name is not a qualified name or the value
+  /// contains what XML 1.0 does not allow (section 2.2: control characters, invalid UTF-8, U+FFFE,
   /// U+FFFF).
   void SetAttribute(std::string_view qualifiedName, std::string_view value);
-  /// Removes the attribute; false when there was none.
+  /// Removes the attribute; false if there is none.
   bool RemoveAttribute(std::string_view qualifiedName) noexcept;
 
  private:
@@ -105,7 +105,7 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
   unsigned declaresNamespaces_ : 1;  // may stay set when the last declaration is removed
 };
 
-/// Makes an element without attributes or children. An empty prefix gives an unprefixed name.
+/// Creates an element without attributes or children. An empty prefix gives an unprefixed name.
 /// Throws `InvalidArgumentException` unless prefix and local name are NCNames (Namespaces in
 /// XML 1.0, section 3).
 TARNIK_EXPORT void CreateElementNode(std::string_view prefix, std::string_view localName,

@@ -25,10 +25,10 @@ enum class NodeKind : unsigned char {
 /// A node of the document tree.
 ///
 /// A reference to any node keeps its whole tree alive, and appending a node joins its tree with the
-/// new parent's; so parents, children and the texts that accessors return as views are valid as
-/// long as anything of the tree is referenced (and, for a value that is set anew, until it is set).
-/// A tree that nobody changes may be read from many threads at once. The memory of a tree is
-/// cleansed before it is given back, since requests hold passwords and answers hold tokens.
+/// tree of its new parent. Therefore parents, children and the views that accessors return are
+/// valid as long as any node of the tree is referenced (and a value only until it is set again). A
+/// tree may be read from many threads at once as long as nobody modifies it. The memory of a tree
+/// is cleansed before it is freed, since requests contain passwords and answers contain tokens.
 class TARNIK_EXPORT Node : public Object {
  public:
   void IncRef() const noexcept final;
@@ -38,13 +38,13 @@ class TARNIK_EXPORT Node : public Object {
   std::string ToString() const override;
 
   NodeKind Kind() const noexcept { return kind_; }
-  /// The element or document that holds this node, or null.
+  /// The element or document that contains this node, or null.
   ParentNode* Parent() const noexcept { return parent_; }
-  /// The element that holds this node, or null (also for the root element of a document).
+  /// The element that contains this node, or null (also for the root element of a document).
   ElementNode* ParentElement() const noexcept;
   /// The next child of the same parent, or null.
   Node* NextSibling() const noexcept;
-  /// Place in the source document, counted from 1 (columns in bytes); 0 for nodes that were not
+  /// Position in the source document, counted from 1 (columns in bytes); 0 for nodes that were not
   /// parsed.
   int Line() const noexcept { return static_cast<int>(line_); }
   int Column() const noexcept { return static_cast<int>(column_); }
@@ -63,10 +63,10 @@ class TARNIK_EXPORT Node : public Object {
 
   Tree* tree_;
   ParentNode* parent_ = nullptr;
-  Node* next_ = nullptr;  // the last child points at the first
+  Node* next_ = nullptr;  // that of the last child is the first child
   unsigned line_ = 0;
   unsigned column_ : 23;
-  unsigned hasCDataSection_ : 1;  // of a text
+  unsigned hasCDataSection_ : 1;  // used by text nodes
   NodeKind kind_;
 };
 
@@ -76,17 +76,17 @@ class TARNIK_EXPORT ParentNode : public Node {
   /// The first and last child, or null.
   Node* FirstChild() const noexcept;
   Node* LastChild() const noexcept { return last_; }
-  /// The first child element with this local name, whatever its namespace, or null.
+  /// The first child element with this local name in any namespace, or null.
   ElementNode* FirstChildElement(std::string_view localName) const noexcept;
   /// The first child element with this expanded name, or null.
   ElementNode* FirstChildElement(std::string_view namespaceUri,
                                  std::string_view localName) const noexcept;
 
-  /// Makes `child` the last child, taking it from the parent that it had. Throws
-  /// `InvalidArgumentException` when `child` is null, a document, or this node or one that holds
-  /// it, and when this node is a document and `child` a text or a second root element.
+  /// Makes `child` the last child and removes it from its previous parent. Throws
+  /// `InvalidArgumentException` when `child` is null, a document, this node, or a node that
+  /// contains it, and when this node is a document and `child` is a text or a second root element.
   void AppendChild(Node* child);
-  /// Takes `child` out; it goes on living in this tree without a parent. Throws
+  /// Removes `child`, which stays in the memory of this tree without a parent. Throws
   /// `InvalidArgumentException` when it is not a child of this node.
   void RemoveChild(Node* child);
 

@@ -10,7 +10,7 @@
 
 namespace Tarnik::Xml {
 
-/// Place in a document, counted from 1 (columns in bytes).
+/// Position in a document, counted from 1 (columns in bytes).
 struct Position {
   unsigned long line;
   unsigned long column;
@@ -21,46 +21,47 @@ struct ParsedAttribute {
   std::string_view value;
 };
 
-/// Receives what a parser finds, in document order. Views are valid only during the call. Used by
-/// one parser, once. An exception leaves the parser unchanged.
+/// Receives the content of a document in document order. Views are valid only during the call. Used
+/// by one parser, once. An exception passes through the parser unchanged.
 class TARNIK_EXPORT XMLHandler : public virtual Object {
  public:
   virtual void StartElement(const Position& position, std::string_view name,
                             const ParsedAttribute* attributes, std::size_t count) = 0;
   virtual void EndElement(const Position& position) = 0;
-  /// Character data; one run of text may come in several calls.
+  /// Character data; one text may be reported in several calls.
   virtual void Characters(const Position& position, std::string_view text) = 0;
   virtual void Comment(const Position& position, std::string_view text) = 0;
   virtual void ProcessingInstruction(const Position& position, std::string_view target,
                                      std::string_view text) = 0;
-  /// The end of a well-formed document; gives what the handler has made of it.
+  /// The end of a well-formed document; returns the handler's result.
   virtual Ref<Object> EndDocument() = 0;
-  /// The start of a CDATA section, whose characters come as any other. Does nothing by default.
+  /// The start of a CDATA section, whose characters are reported like any others. Does nothing by
+  /// default.
   virtual void StartCDataSection(const Position&) {}
 };
 
-/// A handler that builds a `Document` and checks what Namespaces in XML 1.0 demands: every prefix
-/// is bound, no two attributes of an element share an expanded name, and "xml" and "xmlns" are used
-/// rightly. It also refuses an element when that element and those around it have more than
-/// `kMaxOpenAttributes` attributes, so that looking a namespace up in the tree stays cheap.
+/// A handler that builds a `Document` and checks the rules of Namespaces in XML 1.0: every prefix
+/// is bound, no two attributes of an element have the same expanded name, and "xml" and "xmlns" are
+/// used correctly. It also refuses an element when that element and those around it have more than
+/// `kMaxOpenAttributes` attributes, so that looking up a namespace in the tree stays cheap.
 TARNIK_EXPORT Ref<XMLHandler> CreateXMLDocumentHandler();
 
-/// How many attributes, namespace declarations included, the elements from the root of a parsed
-/// document to any one element may have together.
+/// The number of attributes, including namespace declarations, that an element of a parsed document
+/// and all elements around it may have together.
 inline constexpr std::size_t kMaxOpenAttributes = 1024;
 
-/// What no parsed document may exceed.
+/// Limits of parsed documents.
 inline constexpr std::size_t kMaxElementDepth = 256;
 inline constexpr std::size_t kMaxDocumentBytes = std::size_t{16} * 1024 * 1024;
 
 /// Reads one XML 1.0 document from a reader.
 class TARNIK_EXPORT XMLParser : public virtual Object {
  public:
-  /// Parses to the end and returns what the handler made. Called once.
+  /// Parses the document to its end and returns the handler's result. Called once.
   ///
-  /// Throws `XMLParseException` with the place of the fault when the document is not well-formed,
-  /// is not UTF-8 (with or without a byte order mark), holds a DOCTYPE, nests deeper than
-  /// `kMaxElementDepth`, or is longer than `kMaxDocumentBytes`.
+  /// Throws `XMLParseException` with the position of the fault when the document is not
+  /// well-formed, is not UTF-8 (with or without a byte order mark), has a DOCTYPE, nests deeper
+  /// than `kMaxElementDepth`, or is longer than `kMaxDocumentBytes`.
   virtual Ref<Object> Parse() = 0;
 };
 

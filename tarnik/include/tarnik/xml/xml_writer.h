@@ -6,10 +6,9 @@
 
 namespace Tarnik::Xml {
 
-/// Writes `node` and all below it as XML text, without an XML declaration. What a parser reads back
-/// is the same tree: text and attributes are escaped as canonical XML does (Canonical XML 1.0,
-/// section 2.3). Only what stands in the tree is written: namespace declarations of elements
-/// outside `node` are not added.
+/// Writes `node` with all its content as XML text, without an XML declaration. Parsing the text
+/// gives the same tree: text and attributes are escaped as in Canonical XML 1.0, section 2.3.
+/// Namespace declarations of elements outside of `node` are not added.
 TARNIK_EXPORT void WriteXml(const Node* node, Writer* writer);
 
 }  // namespace Tarnik::Xml

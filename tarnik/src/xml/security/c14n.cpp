@@ -9,6 +9,8 @@
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 
+#include "support/ascii.h"
+#include "support/quote.h"
 #include "xml/namespace_scope.h"
 #include "xml/namespaces.h"
 #include "xml/output_buffer.h"
@@ -26,16 +28,12 @@ constexpr std::string_view kExclusive = "http://www.w3.org/2001/10/xml-exc-c14n#
 constexpr std::string_view kExclusiveWithComments =
     "http://www.w3.org/2001/10/xml-exc-c14n#WithComments";
 
-constexpr bool IsLetter(char character) noexcept {
-  return (character >= 'a' && character <= 'z') || (character >= 'A' && character <= 'Z');
-}
-
 constexpr bool IsSchemeCharacter(char character) noexcept {
-  return IsLetter(character) || (character >= '0' && character <= '9') || character == '+' ||
-         character == '-' || character == '.';
+  return IsLetter(character) || IsDigit(character) || character == '+' || character == '-' ||
+         character == '.';
 }
 
-// RFC 3986, section 4.3: what has no scheme is a relative reference.
+// RFC 3986, section 4.2: a relative reference has no scheme.
 bool HasScheme(std::string_view uri) noexcept {
   if (uri.empty() || !IsLetter(uri.front())) {
     return false;
@@ -44,9 +42,9 @@ bool HasScheme(std::string_view uri) noexcept {
   return end != uri.end() && *end == ':';
 }
 
-/// One canonicalisation. A single walk keeps, beside the bindings in scope, what the output has
-/// bound to each prefix so far; both methods render a declaration exactly when the two differ, and
-/// only the prefixes that they ask about differ.
+/// One canonicalisation. For each prefix in scope the walk keeps the binding of the input and the
+/// binding of the output so far. Both methods write a declaration exactly when the two differ; they
+/// differ only in the prefixes that they check.
 class CanonicalWalk {
  public:
   CanonicalWalk(const C14nOptions& options, Writer& writer)
@@ -111,7 +109,7 @@ void CanonicalWalk::Run(const Node& apex, const ElementNode* omitted) {
 }
 
 // Canonical XML 1.0, section 2.3, "Processing Instruction Nodes" and "Comment Nodes": a line feed
-// stands between the root element and what is around it.
+// separates the root element from the nodes around it.
 void CanonicalWalk::WriteDocument(const Document& document, const ElementNode* omitted) {
   bool afterRoot = false;
   for (const Node* node = document.FirstChild(); node != nullptr; node = node->NextSibling()) {
@@ -140,7 +138,7 @@ void CanonicalWalk::WalkElement(const ElementNode& apex, const ElementNode* omit
   WriteStartTag(apex);
   const ElementNode* parent = &apex;
   const Node* node = apex.FirstChild();
-  // A walk instead of a recursion: trees made by hand may be as deep as memory allows.
+  // Iterative, since trees that callers build may be as deep as memory allows.
   while (true) {
     if (node == nullptr) {
       WriteEndTag(*parent);
@@ -221,7 +219,7 @@ void CanonicalWalk::WriteEndTag(const ElementNode& element) {
   --depth_;
 }
 
-// An element below others is a subset of its document: the bindings that it inherits are in scope.
+// An element inside a document is a subset of it, so the bindings of its ancestors are in scope.
 void CanonicalWalk::EnterContext(const ElementNode& apex) {
   std::vector<const ElementNode*> ancestors;
   for (const ElementNode* up = apex.ParentElement(); up != nullptr; up = up->ParentElement()) {
@@ -236,8 +234,8 @@ void CanonicalWalk::EnterContext(const ElementNode& apex) {
   }
 }
 
-// Canonical XML 1.0, section 2.4: the nearest of each attribute in the xml namespace. Sorting keeps
-// the cost low when there are many.
+// Canonical XML 1.0, section 2.4: of each attribute in the xml namespace, the nearest one. Sorted,
+// so that many of them do not take quadratic time.
 void CanonicalWalk::InheritXmlAttributes(const ElementNode& apex) {
   for (const ElementNode* up = &apex; up != nullptr; up = up->ParentElement()) {
     for (std::size_t index = 0; index < up->AttributeCount(); ++index) {
@@ -266,14 +264,14 @@ void CanonicalWalk::Declare(const ElementNode& element) {
     const Attribute& attribute = TreeBuilder::AttributesOf(element)[index];
     const InternedName& name = TreeBuilder::NameOf(attribute);
     const std::string_view prefix = name.DeclaredPrefix();
-    // The prefix "xml" needs no declaration, and canonical text never has one.
+    // The prefix "xml" needs no declaration, and the canonical form never has one.
     if (!name.isDeclaration || prefix == "xml") {
       continue;
     }
     const std::string_view uri = attribute.Value();
     if (!uri.empty() && !HasScheme(uri)) {
-      throw XmlSecurityException("Element '" + std::string(element.QualifiedNameText()) +
-                                 "' declares a namespace with a relative URI.");
+      throw XmlSecurityException("Element " + QuoteVerbatim(element.QualifiedNameText()) +
+                                 " declares a namespace with a relative URI.");
     }
     const NamespaceScope::Binding* outer = scope_.Find(prefix);
     scope_.Push({prefix, uri, outer == nullptr ? std::string_view() : outer->rendered, depth_});
@@ -294,7 +292,7 @@ void CanonicalWalk::CollectDeclarations(const ElementNode& element) {
   }
   const bool anyInclusive = !options_.exclusive || !options_.inclusivePrefixes.empty();
   if (anyInclusive && (atApex_ || TreeBuilder::DeclaresNamespaces(element))) {
-    // Walked by place: rendering may add bindings behind.
+    // Iterated by index, since rendering may append bindings.
     for (std::size_t index = scope_.Size(); index > 0; --index) {
       const NamespaceScope::Binding& binding = scope_.At(index - 1);
       if (!atApex_ && binding.depth < depth_) {
@@ -318,8 +316,8 @@ void CanonicalWalk::Use(std::string_view prefix, const ElementNode& element) {
     return;
   }
   if (!prefix.empty() && prefix != "xml") {
-    throw XmlSecurityException("The prefix '" + std::string(prefix) + "' at element '" +
-                               std::string(element.QualifiedNameText()) + "' is not bound.");
+    throw XmlSecurityException("The prefix " + QuoteVerbatim(prefix) + " at element " +
+                               QuoteVerbatim(element.QualifiedNameText()) + " is not bound.");
   }
 }
 
@@ -330,7 +328,7 @@ void CanonicalWalk::UseInclusive(std::string_view prefix) {
   }
 }
 
-// An empty default namespace is rendered only to undo another one.
+// An empty default namespace is rendered only to override another one.
 void CanonicalWalk::Render(NamespaceScope::Binding& binding) {
   if (binding.rendered == binding.uri) {
     return;

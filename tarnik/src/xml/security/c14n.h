@@ -1,5 +1,5 @@
-#ifndef TARNIK_SRC_XML_SECURITY_C14N_H
-#define TARNIK_SRC_XML_SECURITY_C14N_H
+#ifndef TARNIK_XML_SECURITY_C14N_H
+#define TARNIK_XML_SECURITY_C14N_H
 
 #include <string>
 #include <string_view>
@@ -18,13 +18,13 @@ struct C14nOptions {
   std::vector<std::string> inclusivePrefixes;
 };
 
-/// Sets `options` to what the algorithm URI names; false for a URI that is no canonicalisation.
+/// Sets `options` for the algorithm URI; false when the URI is not a supported canonicalisation.
 bool ReadC14nAlgorithm(std::string_view algorithm, C14nOptions& options) noexcept;
 
-/// Writes the canonical form of `node`, a document or an element with all that is in it, but for
-/// `omitted` (null for nothing) and what is in that: the enveloped-signature transform. Throws
+/// Writes the canonical form of `node`, a document or an element with all its content, without the
+/// element `omitted` (null for nothing), which is the enveloped-signature transform. Throws
 /// `XmlSecurityException` for a relative namespace URI in scope, and with the exclusive method for
-/// a prefix that nothing binds. What was written before a failure is of no use.
+/// an unbound prefix. The output is incomplete after a failure.
 void WriteCanonical(const Node* node, const ElementNode* omitted, const C14nOptions& options,
                     Writer& writer);
 

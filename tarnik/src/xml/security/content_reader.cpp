@@ -117,7 +117,7 @@ std::string TextOf(const ElementNode* element) {
       Refuse(element, "may hold nothing but text");
     }
     const auto* part = static_cast<const TextNode*>(node);
-    // Other readers see a CDATA section as a node of its own, and may take the first for the whole.
+    // Other XML readers give a CDATA section a separate node, and may use only the first node.
     if (part->HasCDataSection()) {
       Refuse(element, "may not hold a CDATA section");
     }

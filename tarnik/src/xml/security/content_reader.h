@@ -11,28 +11,28 @@ namespace Tarnik::Xml::Security {
 
 inline constexpr std::string_view kDsNamespace = "http://www.w3.org/2000/09/xmldsig#";
 
-/// True for text that holds nothing but tab, line feed, carriage return and blank.
+/// True for text that contains only tabs, line feeds, carriage returns and blanks.
 bool IsWhiteSpace(std::string_view text) noexcept;
 /// `text` without the white space around it.
 std::string_view Trim(std::string_view text) noexcept;
 
-/// Takes the child elements of an element one after the other. Only white space and comments may
-/// stand between them; anything else is a `SignatureSyntaxException`.
+/// Returns the child elements of an element one after the other. Only white space and comments may
+/// be between them; anything else is a `SignatureSyntaxException`.
 class ContentReader {
  public:
   explicit ContentReader(const ElementNode* element);
 
   /// The current element, or null at the end.
   const ElementNode* Peek() const noexcept { return current_; }
-  /// True when the current element has this name in XML-Signature's namespace.
+  /// True when the current element has this name in the namespace of XML Signature.
   bool IsAt(std::string_view localName) const noexcept;
-  /// Takes the current element, which there must be.
+  /// Returns the current element and moves to the next one. Throws at the end.
   const ElementNode* TakeAny();
-  /// Takes the current element, which must have this name in XML-Signature's namespace.
+  /// As `TakeAny`, but throws unless the element has this name in the namespace of XML Signature.
   const ElementNode* Take(std::string_view localName);
-  /// As `Take`, but null when the current element has another name.
+  /// As `Take`, but returns null when the current element has another name, and at the end.
   const ElementNode* TakeIf(std::string_view localName);
-  /// Throws unless every element was taken.
+  /// Throws unless all elements were taken.
   void ExpectEnd() const;
 
  private:
@@ -47,11 +47,11 @@ class ContentReader {
 void ExpectAttributes(const ElementNode* element, std::initializer_list<std::string_view> names);
 /// The value of the "Algorithm" attribute; no other attribute is allowed.
 std::string AlgorithmOf(const ElementNode* element);
-/// The text of an element without attributes that holds only text and no CDATA section, without the
-/// white space around it.
+/// The trimmed text of an element. Throws `SignatureSyntaxException` when the element contains
+/// anything but text, or a CDATA section.
 std::string TextOf(const ElementNode* element);
-/// The bytes that the element's text gives in Base64 (XML Schema Part 2, section 3.2.16); at least
-/// one.
+/// The bytes of the element's text, decoded from Base64 (XML Schema Part 2, section 3.2.16). Throws
+/// `SignatureSyntaxException` when it is not Base64 or empty.
 std::vector<unsigned char> BytesOf(const ElementNode* element);
 
 }  // namespace Tarnik::Xml::Security

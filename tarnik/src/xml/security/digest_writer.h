@@ -7,7 +7,7 @@
 #include <cstddef>
 #include <string_view>
 
-#include "crypto/algorithms.h"
+#include "crypto/hash.h"
 #include "support/openssl.h"
 
 namespace Tarnik::Xml::Security {
@@ -17,13 +17,14 @@ struct Digest {
   std::size_t length;
 };
 
-/// Hashes what is written, one digest after the other. Throws `CryptoException` when OpenSSL fails.
+/// Computes the digests of what is written, one after the other. Throws `CryptoException` when
+/// OpenSSL fails.
 class DigestWriter final : public Writer, public ObjectImpl {
  public:
   DigestWriter();
   ~DigestWriter() override;
 
-  /// Begins a digest; what was written before is forgotten.
+  /// Starts a digest; what was written before is discarded.
   void Start(Crypto::Hash hash);
   void Write(std::string_view text) override;
   Digest Finish();

@@ -44,7 +44,7 @@ KeyInfo::IssuerSerial ReadIssuerSerial(const ElementNode* element) {
   return issuerSerial;
 }
 
-// XML-Signature, section 4.4.4.
+// XML Signature 1.1, section 4.5.4.
 void ReadX509Data(const ElementNode* element, KeyInfo& keyInfo) {
   ExpectAttributes(element, {});
   ContentReader content(element);
@@ -66,16 +66,16 @@ void ReadX509Data(const ElementNode* element, KeyInfo& keyInfo) {
   }
 }
 
-// Fetching a key from elsewhere is nothing that a message may ask for.
-bool PointsElsewhere(const ElementNode* element) {
+// Refused, since a message must not make the reader fetch a key.
+bool RefersToKeyElsewhere(const ElementNode* element) {
   return element->NamespaceUri() == kDs11Namespace && element->LocalName() == "KeyInfoReference";
 }
 
-bool IsPassedOver(const ElementNode* element) {
+bool IsSkipped(const ElementNode* element) {
   static constexpr std::array<std::string_view, 4> kKinds{"KeyValue", "PGPData", "SPKIData",
                                                           "MgmtData"};
   if (element->NamespaceUri() != kDsNamespace) {
-    return !PointsElsewhere(element);
+    return !RefersToKeyElsewhere(element);
   }
   return std::find(kKinds.begin(), kKinds.end(), element->LocalName()) != kKinds.end();
 }
@@ -93,7 +93,7 @@ KeyInfo ReadKeyInfo(const ElementNode* element) {
       ReadX509Data(data, keyInfo);
     } else if (const ElementNode* name = content.TakeIf("KeyName")) {
       keyInfo.keyNames.push_back(PlainTextOf(name));
-    } else if (IsPassedOver(content.Peek())) {
+    } else if (IsSkipped(content.Peek())) {
       content.TakeAny();
     } else {
       Refuse(element, content.Peek());

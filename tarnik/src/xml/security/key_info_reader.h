@@ -5,9 +5,9 @@
 
 namespace Tarnik::Xml::Security {
 
-/// Reads a ds:KeyInfo element. What says nothing about X.509 certificates (KeyValue and extensions
-/// of others) is passed over. Throws `SignatureSyntaxException`, also for what would have to be
-/// fetched: RetrievalMethod and KeyInfoReference.
+/// Reads a ds:KeyInfo element. Content without information on X.509 certificates (KeyValue and
+/// extensions) is skipped. Throws `SignatureSyntaxException`, also for content that refers to a key
+/// elsewhere: RetrievalMethod and KeyInfoReference.
 KeyInfo ReadKeyInfo(const ElementNode* element);
 
 }  // namespace Tarnik::Xml::Security

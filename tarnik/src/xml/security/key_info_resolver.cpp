@@ -14,7 +14,7 @@ namespace {
 using Crypto::Certificate;
 using CertificateList = std::vector<Ref<const Certificate>>;
 
-CertificateList Checked(CertificateList certificates) {
+CertificateList RequireCertificates(CertificateList certificates) {
   if (certificates.empty()) {
     throw InvalidArgumentException("A key resolver needs at least one trusted certificate.");
   }
@@ -29,15 +29,15 @@ bool Equals(const Certificate& certificate, const std::vector<unsigned char>& de
          std::memcmp(certificate.DerBytes(), der.data(), der.size()) == 0;
 }
 
-// Names are hints, so it does no harm to see past the blanks that many writers put behind commas
-// and around equals signs.
+// Many programs write blanks after commas and around equals signs. Names are only hints, so
+// ignoring blanks is safe.
 std::string WithoutBlanks(std::string_view name) {
   std::string text(name);
   text.erase(std::remove(text.begin(), text.end(), ' '), text.end());
   return text;
 }
 
-bool SameName(std::string_view a, std::string_view b) {
+bool IsSameName(std::string_view a, std::string_view b) {
   return a == b || WithoutBlanks(a) == WithoutBlanks(b);
 }
 
@@ -46,17 +46,17 @@ std::string_view WithoutLeadingZeros(std::string_view number) {
   return number;
 }
 
-bool Is(const Certificate& certificate, const KeyInfo::IssuerSerial& issuerSerial) {
+bool HasIssuerSerial(const Certificate& certificate, const KeyInfo::IssuerSerial& issuerSerial) {
   return WithoutLeadingZeros(certificate.SerialNumber()) ==
              WithoutLeadingZeros(issuerSerial.serialNumber) &&
-         SameName(certificate.IssuerName(), issuerSerial.issuerName);
+         IsSameName(certificate.IssuerName(), issuerSerial.issuerName);
 }
 
 Ref<const Crypto::PublicKey> KeyOf(const Ref<const Certificate>& certificate) {
   return certificate == nullptr ? nullptr : certificate->GetPublicKey();
 }
 
-/// The trusted certificate that one of `hints` names, or null. Hints that name several choose none.
+/// The only trusted certificate that one of `hints` names; null when they name none or several.
 template <class Hint, class Matches>
 Ref<const Certificate> Choose(const CertificateList& trusted, const std::vector<Hint>& hints,
                               Matches matches) {
@@ -84,13 +84,13 @@ class TrustedCertificatesResolver final : public KeyInfoResolver, public ObjectI
   }
 
  private:
-  // The most telling hint decides alone.
+  // Only the most specific kind of hint is used.
   Ref<const Certificate> Find(const KeyInfo& keyInfo) const {
     if (!keyInfo.certificates.empty()) {
-      return Carried(keyInfo);
+      return FindByCertificates(keyInfo);
     }
     if (!keyInfo.issuerSerials.empty()) {
-      return Choose(trusted_, keyInfo.issuerSerials, Is);
+      return Choose(trusted_, keyInfo.issuerSerials, HasIssuerSerial);
     }
     if (!keyInfo.subjectKeyIdentifiers.empty()) {
       return Choose(trusted_, keyInfo.subjectKeyIdentifiers,
@@ -101,15 +101,15 @@ class TrustedCertificatesResolver final : public KeyInfoResolver, public ObjectI
     if (!keyInfo.subjectNames.empty()) {
       return Choose(trusted_, keyInfo.subjectNames,
                     [](const Certificate& certificate, const std::string& name) {
-                      return SameName(certificate.SubjectName(), name);
+                      return IsSameName(certificate.SubjectName(), name);
                     });
     }
     return trusted_.size() == 1 ? trusted_.front() : nullptr;
   }
 
-  // A chain may be carried whose certificates are trusted, too; the signer's stands in front of
-  // them by custom.
-  Ref<const Certificate> Carried(const KeyInfo& keyInfo) const {
+  // KeyInfo may contain a chain with several trusted certificates; by convention the signer's comes
+  // first.
+  Ref<const Certificate> FindByCertificates(const KeyInfo& keyInfo) const {
     for (const std::vector<unsigned char>& der : keyInfo.certificates) {
       for (const Ref<const Certificate>& certificate : trusted_) {
         if (Equals(*certificate, der)) {
@@ -128,7 +128,7 @@ class CertificateIssuerResolver final : public KeyInfoResolver, public ObjectImp
   explicit CertificateIssuerResolver(CertificateList trusted) : trusted_(std::move(trusted)) {}
 
   Ref<const Crypto::PublicKey> Resolve(const KeyInfo& keyInfo) const override {
-    return KeyOf(Choose(trusted_, IssuersNamedBy(keyInfo), Is));
+    return KeyOf(Choose(trusted_, IssuersNamedBy(keyInfo), HasIssuerSerial));
   }
 
  private:
@@ -138,11 +138,10 @@ class CertificateIssuerResolver final : public KeyInfoResolver, public ObjectImp
     }
     const std::vector<unsigned char>& der = keyInfo.certificates.front();
     try {
-      const auto carried = Crypto::CreateCertificateFromDer(der.data(), der.size());
-      return {{carried->IssuerName(), carried->SerialNumber()}};
+      const auto certificate = Crypto::CreateCertificateFromDer(der.data(), der.size());
+      return {{certificate->IssuerName(), certificate->SerialNumber()}};
     } catch (const Crypto::CryptoException&) {
-      // What is no certificate names no issuer.
-      return {};
+      return {};  // an unreadable certificate names no issuer
     }
   }
 
@@ -152,11 +151,11 @@ class CertificateIssuerResolver final : public KeyInfoResolver, public ObjectImp
 }  // namespace
 
 Ref<const KeyInfoResolver> CreateTrustedCertificatesResolver(CertificateList certificates) {
-  return MakeRef<TrustedCertificatesResolver>(Checked(std::move(certificates)));
+  return MakeRef<TrustedCertificatesResolver>(RequireCertificates(std::move(certificates)));
 }
 
 Ref<const KeyInfoResolver> CreateCertificateIssuerResolver(CertificateList certificates) {
-  return MakeRef<CertificateIssuerResolver>(Checked(std::move(certificates)));
+  return MakeRef<CertificateIssuerResolver>(RequireCertificates(std::move(certificates)));
 }
 
 }  // namespace Tarnik::Xml::Security

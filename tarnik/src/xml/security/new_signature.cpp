@@ -8,7 +8,7 @@
 #include <utility>
 
 #include "crypto/ecdsa_value.h"
-#include "xml/security/algorithm_list.h"
+#include "xml/security/algorithms.h"
 #include "xml/security/content_reader.h"
 #include "xml/security/key_check.h"
 #include "xml/security/key_info_reader.h"
@@ -54,13 +54,13 @@ std::vector<unsigned char> BytesOf(const Digest& digest) {
 
 }  // namespace
 
-/// Takes the values out again unless signing succeeds.
-class NewSignature::UnfinishedValues {
+/// Removes the values from the element again unless signing succeeds.
+class NewSignature::ValueRollback {
  public:
-  explicit UnfinishedValues(NewSignature& signature) noexcept : signature_(signature) {}
-  UnfinishedValues(const UnfinishedValues&) = delete;
-  UnfinishedValues& operator=(const UnfinishedValues&) = delete;
-  ~UnfinishedValues() {
+  explicit ValueRollback(NewSignature& signature) noexcept : signature_(signature) {}
+  ValueRollback(const ValueRollback&) = delete;
+  ValueRollback& operator=(const ValueRollback&) = delete;
+  ~ValueRollback() {
     if (signature_.signed_ != nullptr) {
       return;
     }
@@ -85,8 +85,8 @@ NewSignature::NewSignature(ElementNode* root, const std::string& c14nMethod,
   const Ref<ElementNode> signedInfo = MakeElement("SignedInfo");
   const Ref<ElementNode> canonicalization = MakeAlgorithm("CanonicalizationMethod", c14nMethod);
   const Ref<ElementNode> method = MakeAlgorithm("SignatureMethod", signatureMethod);
-  RequireCanonicalizationMethod(c14nMethod, canonicalization.get());
-  RequireSignatureMethod(signatureMethod, method.get());
+  LookUpCanonicalizationMethod(c14nMethod, canonicalization.get());
+  LookUpSignatureMethod(signatureMethod, method.get());
   const Ref<ElementNode> value = MakeElement("SignatureValue");
   signedInfo->AppendChild(canonicalization.get());
   signedInfo->AppendChild(method.get());
@@ -113,7 +113,7 @@ Ref<SignatureReference> NewSignature::AddReference(std::string_view uri,
   const Ref<ElementNode> reference = MakeElement("Reference");
   reference->SetAttribute("URI", uri);
   const Ref<ElementNode> method = MakeAlgorithm("DigestMethod", digestMethod);
-  RequireDigestMethod(digestMethod, method.get());
+  LookUpDigestMethod(digestMethod, method.get());
   const Ref<ElementNode> value = MakeElement("DigestValue");
   reference->AppendChild(method.get());
   reference->AppendChild(value.get());
@@ -126,7 +126,7 @@ Ref<SignatureReference> NewSignature::AddReference(std::string_view uri,
   read.digestMethod = digestMethod;
   ReferenceElements elements;
   elements.digestMethod = method.get();
-  // With room made beforehand, nothing below fails.
+  // With reserved capacity, nothing below can fail.
   parts_.reserve(kMaxReferences);
   content_.references.reserve(kMaxReferences);
   content_.referenceElements.reserve(kMaxReferences);
@@ -144,12 +144,12 @@ void NewSignature::AddTransform(std::size_t index, std::string_view algorithm) {
   std::vector<const ElementNode*> elements = content_.referenceElements[index].transforms;
   algorithms.emplace_back(algorithm);
   elements.push_back(transform.get());
-  RequireTransforms(algorithms, elements);
+  PlanTransforms(algorithms, elements);
 
   ReferenceParts& parts = parts_[index];
   if (parts.transforms == nullptr) {
     const Ref<ElementNode> transforms = MakeElement("Transforms");
-    // In the order of the schema: appending moves what stands there already.
+    // In the order of the schema. Appending an existing child moves it to the end.
     parts.reference->AppendChild(transforms.get());
     parts.reference->AppendChild(parts.digestMethod);
     parts.reference->AppendChild(parts.digestValue);
@@ -162,10 +162,10 @@ void NewSignature::AddTransform(std::size_t index, std::string_view algorithm) {
 
 void NewSignature::SetKeyInfo(ElementNode* content) {
   RequireBlank();
-  // The signature's own parts stay where they are.
   if (content == nullptr || IsWithin(element_.get(), content) ||
       IsWithin(content, element_.get())) {
-    throw InvalidArgumentException("This is no element that KeyInfo could hold.");
+    throw InvalidArgumentException(
+        "The content of KeyInfo must be an element outside of the signature.");
   }
   const Ref<ElementNode> keyInfo = MakeElement("KeyInfo");
   keyInfo->AppendChild(content);
@@ -194,14 +194,14 @@ void NewSignature::Sign(const Crypto::PrivateKey* key) {
   const Node* root = RootOf(root_.get());
   const SignaturePlan plan = PlanSignature(root, element_.get(), content_);
   if (!plan.signedInfo.canonicalization.exclusive) {
-    RequirePlace(root);
+    RequireElementIn(root);
   }
   CheckSigningKey(implementation.Public(), plan.scheme, content_.signatureMethod);
 
-  const UnfinishedValues unfinished(*this);
+  const ValueRollback rollback(*this);
   SignatureContent content = content_;
   try {
-    content.signatureValue = ValueBy(implementation, plan, content);
+    content.signatureValue = ComputeValues(implementation, plan, content);
   } catch (const Crypto::CryptoException& error) {
     throw XmlSecurityException(error.Message());
   }
@@ -228,12 +228,12 @@ void NewSignature::RequireBlank() const {
   }
 }
 
-// Canonical XML 1.0 carries namespaces and xml: attributes of the elements around SignedInfo into
-// what is signed.
-void NewSignature::RequirePlace(const Node* root) const {
+// Canonical XML 1.0 adds namespaces and xml: attributes of the elements around SignedInfo to the
+// signed octets.
+void NewSignature::RequireElementIn(const Node* root) const {
   if (!IsWithin(element_.get(), root)) {
     throw XmlSecurityException(
-        "A signature with inclusive canonicalisation must stand in its document before it is "
+        "A signature with inclusive canonicalisation must be in its document before it is "
         "signed.");
   }
 }
@@ -245,10 +245,10 @@ const SignatureImpl& NewSignature::Signed() const {
   return *signed_;
 }
 
-// The digests go into the tree first, since SignedInfo is canonicalised from there.
-std::vector<unsigned char> NewSignature::ValueBy(const Crypto::PrivateKeyImpl& key,
-                                                 const SignaturePlan& plan,
-                                                 SignatureContent& content) {
+// The digests are written to the tree first, since SignedInfo is canonicalised from there.
+std::vector<unsigned char> NewSignature::ComputeValues(const Crypto::PrivateKeyImpl& key,
+                                                       const SignaturePlan& plan,
+                                                       SignatureContent& content) {
   DigestWriter writer;
   for (std::size_t i = 0; i < parts_.size(); ++i) {
     std::vector<unsigned char>& value = content.references[i].digestValue;

@@ -14,8 +14,8 @@
 
 namespace Tarnik::Xml::Security {
 
-/// A signature that is made. Its element is whole from the start, but for the values; once these
-/// are there, what a reader would see is asked of a `SignatureImpl`.
+/// A signature that is being created. Its element is complete from the start except for the values.
+/// Once it is signed, a `SignatureImpl` provides what a reader of the element would see.
 class NewSignature final : public Signature, public ObjectImpl {
  public:
   /// Throws as `CreateBlankSignature` does.
@@ -40,23 +40,24 @@ class NewSignature final : public Signature, public ObjectImpl {
   void AddTransform(std::size_t index, std::string_view algorithm);
 
  private:
-  /// The elements of a reference that change. They live in the signature's tree.
+  /// The elements of a reference that are modified. They are part of the signature's tree.
   struct ReferenceParts {
     ElementNode* reference;
-    ElementNode* transforms;  // null before the first
+    ElementNode* transforms;  // null before the first transform
     ElementNode* digestMethod;
     ElementNode* digestValue;
     TextNode* digestText;
   };
-  class UnfinishedValues;
+  class ValueRollback;
 
   Ref<ElementNode> MakeElement(std::string_view localName) const;
   Ref<ElementNode> MakeAlgorithm(std::string_view localName, std::string_view algorithm) const;
   void RequireBlank() const;
-  void RequirePlace(const Node* root) const;
+  void RequireElementIn(const Node* root) const;
   const SignatureImpl& Signed() const;
-  std::vector<unsigned char> ValueBy(const Crypto::PrivateKeyImpl& key, const SignaturePlan& plan,
-                                     SignatureContent& content);
+  /// Writes the digests into `content` and the tree; returns the signature value.
+  std::vector<unsigned char> ComputeValues(const Crypto::PrivateKeyImpl& key,
+                                           const SignaturePlan& plan, SignatureContent& content);
 
   const std::string prefix_;
   const Ref<ElementNode> root_;

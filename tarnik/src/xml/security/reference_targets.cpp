@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <string_view>
 
+#include "support/ascii.h"
 #include "support/quote.h"
 #include "xml/security/content_reader.h"
 
@@ -14,29 +15,27 @@ namespace {
 constexpr std::string_view kWsuNamespace =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
 
-/// What the document holds of one id.
-struct Search {
+/// The search for the element with one id.
+struct IdLookup {
   std::string_view id;
-  const ElementNode* carrier = nullptr;
-  bool isUsable = false;  // an attribute of the carrier is a true id with exactly this value
+  const ElementNode* element = nullptr;  // the element found so far
+  bool isTrueId = false;                 // an attribute of it is an id with exactly this value
 };
 
-constexpr bool IsAsciiLetter(char c) noexcept {
-  return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z');
-}
-
 constexpr bool IsIdCharacter(char c) noexcept {
-  return IsAsciiLetter(c) || (c >= '0' && c <= '9') || c == '_' || c == '-' || c == '.';
+  return IsLetter(c) || IsDigit(c) || c == '_' || c == '-' || c == '.';
 }
 
-// The NCNames that stand in a URI without escapes (RFC 3986, section 3.5).
+// True for an NCName that needs no escapes in a URI fragment (RFC 3986, section 3.5).
 bool IsPlainId(std::string_view text) noexcept {
-  return !text.empty() && (IsAsciiLetter(text[0]) || text[0] == '_') &&
+  return !text.empty() && (IsLetter(text[0]) || text[0] == '_') &&
          std::all_of(text.begin(), text.end(), IsIdCharacter);
 }
 
-bool MayBeTakenForId(std::string_view localName) noexcept {
-  return localName.size() == 2 && (localName[0] | 0x20) == 'i' && (localName[1] | 0x20) == 'd';
+// True for "id" in any letter case (id, Id, iD, ID), whatever the prefix: other software may treat
+// such an attribute as an id, even where `IsTrueId` does not.
+bool IsIdInAnyCase(std::string_view localName) noexcept {
+  return EqualsIgnoringCase(localName, "id");
 }
 
 bool IsTrueId(const ElementNode* element, const QualifiedName& name) noexcept {
@@ -49,49 +48,50 @@ bool IsTrueId(const ElementNode* element, const QualifiedName& name) noexcept {
   return name.Local() == "Id" && element->LookupNamespace(name.Prefix()) == kWsuNamespace;
 }
 
-void Note(const ElementNode* element, const Attribute& attribute, Search& search) {
-  // An xml:id is compared without the blanks around it (xml:id 1.0, section 4), and some processors
-  // do so with every id; a value that only they would find is a second carrier, too.
-  if (Trim(attribute.Value()) != search.id) {
+void CompareId(const ElementNode* element, const Attribute& attribute, IdLookup& lookup) {
+  // An xml:id is compared without surrounding blanks (xml:id 1.0, section 4), and some software
+  // does so for every id. A value that only such software would find counts as a second element
+  // too.
+  if (Trim(attribute.Value()) != lookup.id) {
     return;
   }
-  if (search.carrier != nullptr && search.carrier != element) {
-    throw XmlSecurityException("The id " + Quote(search.id) +
-                               " of a reference stands on more than one element.");
+  if (lookup.element != nullptr && lookup.element != element) {
+    throw XmlSecurityException("More than one element has the id " + Quote(lookup.id) +
+                               " of a reference.");
   }
-  search.carrier = element;
-  if (attribute.Value() == search.id && IsTrueId(element, attribute.Qualified())) {
-    search.isUsable = true;
+  lookup.element = element;
+  if (attribute.Value() == lookup.id && IsTrueId(element, attribute.Qualified())) {
+    lookup.isTrueId = true;
   }
 }
 
-void NoteIds(const ElementNode* element, std::vector<Search>& searches) {
+void CollectIdsOf(const ElementNode* element, std::vector<IdLookup>& lookups) {
   for (std::size_t i = 0; i < element->AttributeCount(); ++i) {
     const Attribute& attribute = element->AttributeAt(i);
-    if (!MayBeTakenForId(attribute.Qualified().Local())) {
+    if (!IsIdInAnyCase(attribute.Qualified().Local())) {
       continue;
     }
-    for (Search& search : searches) {
-      Note(element, attribute, search);
+    for (IdLookup& lookup : lookups) {
+      CompareId(element, attribute, lookup);
     }
   }
 }
 
-// The topmost node above an element is an element or a document.
+// `root` is an element or a document, since it is the topmost node above an element.
 const ElementNode* RootElementOf(const Node* root) noexcept {
   return root->Kind() == NodeKind::kDocument ? static_cast<const Document*>(root)->RootElement()
                                              : static_cast<const ElementNode*>(root);
 }
 
-void NoteAllIds(const Node* root, std::vector<Search>& searches) {
+void CollectIds(const Node* root, std::vector<IdLookup>& lookups) {
   for (const ElementNode* element = RootElementOf(root); element != nullptr;
        element = element->NextElement(nullptr)) {
-    NoteIds(element, searches);
+    CollectIdsOf(element, lookups);
   }
 }
 
-std::vector<Search> SearchesFor(const std::vector<Reference>& references) {
-  std::vector<Search> searches;
+std::vector<IdLookup> LookupsFor(const std::vector<Reference>& references) {
+  std::vector<IdLookup> lookups;
   for (const Reference& reference : references) {
     const std::string_view uri = reference.uri;
     if (uri.empty()) {
@@ -101,17 +101,16 @@ std::vector<Search> SearchesFor(const std::vector<Reference>& references) {
       throw XmlSecurityException("The reference " + Quote(uri) +
                                  " is not of the form '#id' within the document.");
     }
-    searches.push_back({uri.substr(1)});
+    lookups.push_back({uri.substr(1)});
   }
-  return searches;
+  return lookups;
 }
 
-const ElementNode* CarrierOf(const Search& search) {
-  if (!search.isUsable) {
-    throw XmlSecurityException("No element carries the id " + Quote(search.id) +
-                               " of a reference.");
+const ElementNode* RequireElement(const IdLookup& lookup) {
+  if (!lookup.isTrueId) {
+    throw XmlSecurityException("No element has the id " + Quote(lookup.id) + " of a reference.");
   }
-  return search.carrier;
+  return lookup.element;
 }
 
 }  // namespace
@@ -132,18 +131,18 @@ bool IsWithin(const Node* inner, const Node* outer) noexcept {
 
 std::vector<const Node*> FindReferenceTargets(const Node* root, const ElementNode* signature,
                                               const std::vector<Reference>& references) {
-  std::vector<Search> searches = SearchesFor(references);
-  if (!searches.empty()) {
-    NoteAllIds(root, searches);
+  std::vector<IdLookup> lookups = LookupsFor(references);
+  if (!lookups.empty()) {
+    CollectIds(root, lookups);
     if (!IsWithin(signature, root)) {
-      NoteAllIds(RootOf(signature), searches);
+      CollectIds(RootOf(signature), lookups);
     }
   }
   std::vector<const Node*> targets;
   targets.reserve(references.size());
   std::size_t next = 0;
   for (const Reference& reference : references) {
-    targets.push_back(reference.uri.empty() ? root : CarrierOf(searches[next++]));
+    targets.push_back(reference.uri.empty() ? root : RequireElement(lookups[next++]));
   }
   return targets;
 }

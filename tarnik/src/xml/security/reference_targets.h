@@ -7,21 +7,20 @@
 
 namespace Tarnik::Xml::Security {
 
-/// The node that each reference points at (XML-Signature, section 4.4.3.2): the whole document for
-/// an empty URI, else the one element that carries the id behind the number sign. The document is
-/// everything below `root`; ids in `signature` count even when it is not part of that yet.
+/// The target of each reference (XML Signature 1.1, section 4.4.3.2): the whole document for an
+/// empty URI, else the only element with the id after the number sign. The document is the tree of
+/// `root`; ids in `signature` count even when it is not part of that tree yet.
 ///
 /// An id is an attribute "ID", "Id" or "id" without a prefix, xml:id, or wsu:Id. Throws
-/// `XmlSecurityException` when a URI has any other form, when no element carries the id, and when
-/// another element carries the same value in an attribute that anyone may take for an id, whatever
-/// its prefix and letter case.
+/// `XmlSecurityException` when a URI has another form, when no element has the id, and when another
+/// element has the same value in any attribute whose local name is "id" in any letter case.
 std::vector<const Node*> FindReferenceTargets(const Node* root, const ElementNode* signature,
                                               const std::vector<Reference>& references);
 
 /// The topmost node that holds `node`.
 const Node* RootOf(const Node* node) noexcept;
 
-/// True when `inner` is `outer` or stands in it.
+/// True when `inner` is `outer` or is in it.
 bool IsWithin(const Node* inner, const Node* outer) noexcept;
 
 }  // namespace Tarnik::Xml::Security

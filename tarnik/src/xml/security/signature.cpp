@@ -50,20 +50,20 @@ bool IsSignatureOf(const Digest& digest, const std::vector<unsigned char>& value
                     value.size());
 }
 
-bool Equal(const Digest& digest, const std::vector<unsigned char>& value) {
+bool IsEqual(const Digest& digest, const std::vector<unsigned char>& value) {
   return std::equal(value.begin(), value.end(), digest.bytes.begin(),
                     digest.bytes.begin() + static_cast<std::ptrdiff_t>(digest.length));
 }
 
-// The signature over SignedInfo comes first: what the references ask for is done only for the owner
-// of the key.
-bool Carries(const SignatureContent& content, const SignaturePlan& plan, const PublicKeyImpl& key) {
+// The signature over SignedInfo is verified first, so that the work that the references require is
+// done only for the owner of the key.
+bool IsValid(const SignatureContent& content, const SignaturePlan& plan, const PublicKeyImpl& key) {
   DigestWriter writer;
   if (!IsSignatureOf(ComputeDigest(plan.signedInfo, writer), content.signatureValue, key, plan)) {
     return false;
   }
   for (std::size_t i = 0; i < plan.references.size(); ++i) {
-    if (!Equal(ComputeDigest(plan.references[i], writer), content.references[i].digestValue)) {
+    if (!IsEqual(ComputeDigest(plan.references[i], writer), content.references[i].digestValue)) {
       return false;
     }
   }
@@ -103,7 +103,7 @@ bool SignatureImpl::Verify(const KeyInfoResolver* resolver) const {
   const PublicKeyImpl& implementation = ImplementationOf(*key);
   CheckTrustedKey(implementation, plan.scheme);
   try {
-    return Carries(content_, plan, implementation);
+    return IsValid(content_, plan, implementation);
   } catch (const Crypto::CryptoException& error) {
     throw XmlSecurityException(error.Message());
   }

@@ -8,7 +8,7 @@
 
 namespace Tarnik::Xml::Security {
 
-/// A signature with values: read from a document, or made and signed.
+/// A signature with values: read from a document, or created and signed.
 class SignatureImpl final : public Signature, public ObjectImpl {
  public:
   SignatureImpl(ElementNode* element, SignatureContent content);
@@ -22,7 +22,7 @@ class SignatureImpl final : public Signature, public ObjectImpl {
   const Security::KeyInfo& KeyInfo() const override { return content_.keyInfo; }
   ElementNode* Element() const override { return element_.get(); }
   bool Verify(const KeyInfoResolver* resolver) const override;
-  /// These throw `InvalidStateException`.
+  /// The functions below throw `InvalidStateException`.
   Ref<SignatureReference> AddReference(std::string_view uri,
                                        std::string_view digestMethod) override;
   void SetKeyInfo(ElementNode* content) override;

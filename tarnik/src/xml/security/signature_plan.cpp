@@ -12,21 +12,21 @@ namespace {
 DigestInput PlanSignedInfo(const SignatureContent& content, Crypto::Hash hash) {
   DigestInput input;
   input.apex = content.signedInfo;
-  input.canonicalization = RequireCanonicalizationMethod(content.canonicalizationMethod,
-                                                         content.canonicalizationMethodElement);
+  input.canonicalization = LookUpCanonicalizationMethod(content.canonicalizationMethod,
+                                                        content.canonicalizationMethodElement);
   input.hash = hash;
   return input;
 }
 
-DigestInput PlanTransforms(const Reference& reference, const ReferenceElements& elements,
-                           const ElementNode* signature) {
+DigestInput PlanReference(const Reference& reference, const ReferenceElements& elements,
+                          const ElementNode* signature) {
   DigestInput input;
-  input.hash = RequireDigestMethod(reference.digestMethod, elements.digestMethod);
-  TransformPlan transforms = RequireTransforms(reference.transforms, elements.transforms);
+  input.hash = LookUpDigestMethod(reference.digestMethod, elements.digestMethod);
+  TransformPlan transforms = PlanTransforms(reference.transforms, elements.transforms);
   input.omitted = transforms.enveloped ? signature : nullptr;
   input.canonicalization = std::move(transforms.canonicalization);
-  // A reference within the document gives a node set that holds no comments, whatever the
-  // canonicalisation would write (XML-Signature, section 4.4.3.3).
+  // A same-document reference yields a node-set without comments, whatever the canonicalisation
+  // would write (XML Signature 1.1, section 4.4.3.3).
   input.canonicalization.withComments = false;
   return input;
 }
@@ -55,14 +55,14 @@ void CheckTarget(const DigestInput& input, const Reference& reference,
 SignaturePlan PlanSignature(const Node* root, const ElementNode* signature,
                             const SignatureContent& content) {
   const SignatureMethod method =
-      RequireSignatureMethod(content.signatureMethod, content.signatureMethodElement);
+      LookUpSignatureMethod(content.signatureMethod, content.signatureMethodElement);
   SignaturePlan plan;
   plan.scheme = method.scheme;
   plan.signedInfo = PlanSignedInfo(content, method.hash);
   plan.references.reserve(content.references.size());
   for (std::size_t i = 0; i < content.references.size(); ++i) {
     plan.references.push_back(
-        PlanTransforms(content.references[i], content.referenceElements[i], signature));
+        PlanReference(content.references[i], content.referenceElements[i], signature));
   }
   const std::vector<const Node*> targets =
       FindReferenceTargets(root, signature, content.references);

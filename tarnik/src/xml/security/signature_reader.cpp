@@ -19,8 +19,8 @@ void ReadTransforms(const ElementNode* element, Reference& reference, ReferenceE
   } while (content.Peek() != nullptr);
 }
 
-// A reference without a URI leaves its target to the application (XML-Signature, section 4.4.3.1);
-// there is none that would know.
+// Without a URI the application must know the target (XML Signature 1.1, section 4.4.3.1). This is
+// not supported.
 std::string UriOf(const ElementNode* element) {
   ExpectAttributes(element, {"Id", "URI", "Type"});
   const auto uri = element->FindAttribute("URI");

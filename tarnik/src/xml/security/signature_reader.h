@@ -9,16 +9,16 @@
 
 namespace Tarnik::Xml::Security {
 
-/// More references than this are a syntax error, so that the work on one signature is bounded.
+/// More references than this are a syntax error, which limits the work for one signature.
 inline constexpr std::size_t kMaxReferences = 16;
 
-/// The elements that a `Reference` was read from: algorithms may have parameters inside.
+/// The elements of the algorithms of a `Reference`, which may contain parameters.
 struct ReferenceElements {
   const ElementNode* digestMethod = nullptr;
   std::vector<const ElementNode*> transforms;
 };
 
-/// What a ds:Signature element holds.
+/// The content of a ds:Signature element.
 struct SignatureContent {
   const ElementNode* signedInfo = nullptr;
   const ElementNode* canonicalizationMethodElement = nullptr;
@@ -31,9 +31,9 @@ struct SignatureContent {
   KeyInfo keyInfo;
 };
 
-/// Reads a ds:Signature element in the order that the schema of XML-Signature, section 4 demands.
-/// ds:Object is not allowed: what a signature covers stands outside of it. Throws
-/// `SignatureSyntaxException`.
+/// Reads a ds:Signature element, whose children must be in the order of the schema (XML
+/// Signature 1.1, section 4). ds:Object is not allowed: signed content must be outside of the
+/// signature. Throws `SignatureSyntaxException`.
 SignatureContent ReadSignature(const ElementNode* element);
 
 }  // namespace Tarnik::Xml::Security

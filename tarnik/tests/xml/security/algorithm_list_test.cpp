@@ -1,4 +1,4 @@
-#include "xml/security/algorithm_list.h"
+#include "xml/security/algorithms.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -72,7 +72,7 @@ TEST_P(UnlistedCanonicalization, IsRefused) {
   SignatureTemplate signature;
   signature.canonicalization = GetParam();
   EXPECT_EQ(Judge(AssertionWithValues(signature)),
-            std::string("refused: The canonicalization algorithm '") + GetParam() +
+            std::string("refused: The canonicalisation algorithm '") + GetParam() +
                 "' is not supported.");
 }
 
@@ -104,12 +104,12 @@ TEST(TransformList, IsLimitedToItsSaneForms) {
   signature.transforms = Transforms({kEnveloped, kExclusive, kExclusive});
   EXPECT_EQ(Judge(AssertionWithValues(signature)),
             "refused: The transform algorithm 'http://www.w3.org/2001/10/xml-exc-c14n#' is not "
-            "supported behind a canonicalization.");
+            "supported after a canonicalisation.");
   signature.transforms = Transforms({kExclusive, kEnveloped});
   EXPECT_EQ(Judge(AssertionWithValues(signature)),
             "refused: The transform algorithm "
-            "'http://www.w3.org/2000/09/xmldsig#enveloped-signature' is not supported behind a "
-            "canonicalization.");
+            "'http://www.w3.org/2000/09/xmldsig#enveloped-signature' is not supported after a "
+            "canonicalisation.");
 }
 
 // Both are right in the eyes of the oracle, so that only the list can be the reason.
@@ -210,7 +210,7 @@ TEST(AlgorithmParameters, PrefixListsAreSplitAtWhiteSpace) {
   const auto document = Tests::ParseDocument(
       "<t><i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2001/10/xml-exc-c14n#\" "
       "PrefixList=\"  a&#10;b&#9;#default  c \"/></t>");
-  const C14nOptions options = RequireCanonicalizationMethod(kExclusive, document->RootElement());
+  const C14nOptions options = LookUpCanonicalizationMethod(kExclusive, document->RootElement());
   EXPECT_TRUE(options.exclusive);
   EXPECT_THAT(options.inclusivePrefixes, ::testing::ElementsAre("a", "b", "#default", "c"));
 }

@@ -145,7 +145,8 @@ TEST(NewSignature, RefusesKeyInfoThatAReaderWouldRefuse) {
   CreateElementNode("ds", "RetrievalMethod", bad);
   EXPECT_EQ(Refusal([&] { request.signature->SetKeyInfo(bad.get()); }),
             "syntax: Element 'ds:KeyInfo' may not hold 'ds:RetrievalMethod'.");
-  const std::string none = "argument: This is no element that KeyInfo could hold.";
+  const std::string none =
+      "argument: The content of KeyInfo must be an element outside of the signature.";
   EXPECT_EQ(Refusal([&] { request.signature->SetKeyInfo(nullptr); }), none);
   EXPECT_EQ(Refusal([&] { request.signature->SetKeyInfo(request.signature->Element()); }), none);
   const std::string made = request.SignedText();
@@ -164,7 +165,7 @@ TEST(NewSignature, KeepsItsOwnPartsOutOfItsKeyInfo) {
     ElementNode* element = Tests::FindElement(request.signature->Element(), part);
     ASSERT_NE(element, nullptr) << part;
     EXPECT_EQ(Refusal([&] { request.signature->SetKeyInfo(element); }),
-              "argument: This is no element that KeyInfo could hold.")
+              "argument: The content of KeyInfo must be an element outside of the signature.")
         << part;
     EXPECT_EQ(TextOf(request.signature->Element()), blank) << part;
   }
@@ -199,7 +200,7 @@ TEST(NewSignature, LooksForReferencesWhenItSigns) {
   body->Parent()->RemoveChild(body.get());
   const std::string blank = TextOf(request.signature->Element());
   EXPECT_EQ(Refusal([&] { request.signature->Sign(SignerKey().get()); }),
-            "security: No element carries the id 'body' of a reference.");
+            "security: No element has the id 'body' of a reference.");
   EXPECT_EQ(TextOf(request.signature->Element()), blank);
   // What is put elsewhere is found there.
   request.document->RootElement()->FirstChildElement("Header")->AppendChild(body.get());
@@ -254,7 +255,7 @@ TEST(NewSignature, WithInclusiveCanonicalisationIsSignedInItsPlaceAlone) {
     Request request(method);
     request.Reference("#body");
     EXPECT_EQ(Refusal([&] { request.signature->Sign(SignerKey().get()); }),
-              "security: A signature with inclusive canonicalisation must stand in its document "
+              "security: A signature with inclusive canonicalisation must be in its document "
               "before it is signed.");
     request.Place();
     request.signature->Sign(SignerKey().get());
@@ -308,8 +309,8 @@ struct TargetCase {
 
 TEST(NewSignature, RefusesReferencesThatHitNothingOrTwo) {
   const TargetCase cases[] = {
-      {"#nothing", "security: No element carries the id 'nothing' of a reference."},
-      {"#twice", "security: The id 'twice' of a reference stands on more than one element."},
+      {"#nothing", "security: No element has the id 'nothing' of a reference."},
+      {"#twice", "security: More than one element has the id 'twice' of a reference."},
       {"body", "security: The reference 'body' is not of the form '#id' within the document."},
       {"http://host/x",
        "security: The reference 'http://host/x' is not of the form '#id' within the document."},
@@ -333,14 +334,14 @@ TEST(NewSignature, CountsTheIdsOfItsOwnKeyInfo) {
   request.signature->SetKeyInfo(token.get());
   request.Reference("#body");
   EXPECT_EQ(Refusal([&] { request.signature->Sign(SignerKey().get()); }),
-            "security: The id 'body' of a reference stands on more than one element.");
+            "security: More than one element has the id 'body' of a reference.");
 }
 
 TEST(NewSignature, RefusesAlgorithmsOffTheListAtOnce) {
   Request request;
   ElementNode* root = request.document->RootElement();
   EXPECT_EQ(Refusal([&] { Blank(root, "urn:c14n"); }),
-            "security: The canonicalization algorithm 'urn:c14n' is not supported.");
+            "security: The canonicalisation algorithm 'urn:c14n' is not supported.");
   EXPECT_EQ(Refusal([&] { Blank(root, kExclusive, "http://www.w3.org/2000/09/xmldsig#rsa-sha1"); }),
             "security: The signature algorithm 'http://www.w3.org/2000/09/xmldsig#rsa-sha1' is not "
             "supported.");
@@ -357,7 +358,7 @@ TEST(NewSignature, RefusesAlgorithmsOffTheListAtOnce) {
   reference->AddTransform(kExclusive);
   EXPECT_EQ(Refusal([&] { reference->AddTransform(kEnveloped); }),
             std::string("security: The transform algorithm '") + kEnveloped +
-                "' is not supported behind a canonicalization.");
+                "' is not supported after a canonicalisation.");
   request.signature->Sign(SignerKey().get());
   request.Place();
   EXPECT_EQ(Tests::Judge(request.Text()), "valid");

@@ -14,8 +14,8 @@ using Tests::Resigned;
 using Tests::Signed;
 
 constexpr const char* kAmbiguous =
-    "refused: The id '_a1' of a reference stands on more than one element.";
-constexpr const char* kMissing = "refused: No element carries the id '_a1' of a reference.";
+    "refused: More than one element has the id '_a1' of a reference.";
+constexpr const char* kMissing = "refused: No element has the id '_a1' of a reference.";
 
 /// The signed assertion beside `other`, in one envelope that the signature does not cover.
 std::string Beside(const std::string& other, bool behind = true) {
@@ -103,7 +103,7 @@ TEST(ReferenceTargets, AcceptTheFormThatTheOthersAreNot) {
   EXPECT_EQ(Judge(Tests::AssertionWithValues(signature)), "invalid");
   signature.uri = "#_a1.b-C9";
   EXPECT_EQ(Judge(Tests::AssertionWithValues(signature)),
-            "refused: No element carries the id '_a1.b-C9' of a reference.");
+            "refused: No element has the id '_a1.b-C9' of a reference.");
 }
 
 TEST(ReferenceTargets, IsTheWholeDocumentForAnEmptyUri) {

@@ -48,7 +48,7 @@ const FileCase kFiles[] = {
     {"signed-info-in-object.xml",
      "syntax: Element 'ds:Signature' holds 'ds:Object' where 'SignedInfo' of XML-Signature is "
      "expected."},
-    {"second-id.xml", "refused: The id '_a1' of a reference stands on more than one element."},
+    {"second-id.xml", "refused: More than one element has the id '_a1' of a reference."},
     {"upper-case-algorithm.xml",
      "refused: The signature algorithm 'http://www.w3.org/2001/04/xmldsig-more#RSA-SHA256' is not "
      "supported."},

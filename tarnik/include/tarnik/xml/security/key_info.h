@@ -9,8 +9,8 @@
 
 namespace Tarnik::Xml::Security {
 
-/// What a message says of the key that signed it (XML-Signature, section 4.4). These are hints for
-/// a `KeyInfoResolver`; nothing here is to be trusted.
+/// What a message says about the key that signed it (XML Signature 1.1, section 4.5). These are
+/// untrusted hints for a `KeyInfoResolver`.
 struct KeyInfo {
   struct IssuerSerial {
     std::string issuerName;    ///< distinguished name, as written

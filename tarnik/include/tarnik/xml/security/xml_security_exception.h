@@ -18,7 +18,7 @@ class TARNIK_EXPORT XmlSecurityException : public Exception {
   [[noreturn]] void Throw() const override;
 };
 
-/// A Signature element that breaks the structure of XML-Signature.
+/// A Signature element that violates the structure of XML Signature.
 class TARNIK_EXPORT SignatureSyntaxException : public XmlSecurityException {
  public:
   explicit SignatureSyntaxException(std::string message,

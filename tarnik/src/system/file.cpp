@@ -1,4 +1,4 @@
-#include "support/file.h"
+#include "system/file.h"
 
 #include <openssl/crypto.h>
 #include <tarnik/core/exception.h>
@@ -9,7 +9,7 @@
 #include <memory>
 #include <system_error>
 
-namespace Tarnik {
+namespace Tarnik::System {
 namespace {
 
 constexpr std::size_t kMaxFileBytes = std::size_t{16} << 20;
@@ -18,7 +18,7 @@ struct CloseFile {
   void operator()(std::FILE* file) const noexcept { static_cast<void>(std::fclose(file)); }
 };
 
-/// A buffer that leaves nothing of what went through it.
+/// A buffer whose destructor overwrites it.
 struct Buffer {
   std::array<char, 4096> bytes;
   ~Buffer() { OPENSSL_cleanse(bytes.data(), bytes.size()); }
@@ -40,7 +40,7 @@ void ReadFile(std::string_view kind, const std::string& path, SensitiveText& tex
   if (file == nullptr) {
     ThrowUnreadable(kind, path, std::generic_category().message(errno));
   }
-  // The stream's own buffer would not be overwritten.
+  // Unbuffered, since the stream's own buffer would not be overwritten.
   std::setvbuf(file.get(), nullptr, _IONBF, 0);
   Buffer buffer;
   while (const std::size_t count =
@@ -55,4 +55,4 @@ void ReadFile(std::string_view kind, const std::string& path, SensitiveText& tex
   }
 }
 
-}  // namespace Tarnik
+}  // namespace Tarnik::System

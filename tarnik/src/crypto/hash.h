@@ -1,5 +1,5 @@
-#ifndef TARNIK_CRYPTO_ALGORITHMS_H
-#define TARNIK_CRYPTO_ALGORITHMS_H
+#ifndef TARNIK_CRYPTO_HASH_H
+#define TARNIK_CRYPTO_HASH_H
 
 #include <array>
 #include <cstddef>
@@ -11,18 +11,15 @@ namespace Tarnik::Crypto {
 enum class Hash : unsigned char { kSha256, kSha384, kSha512 };
 inline constexpr std::size_t kHashCount = 3;
 
-/// Signature algorithms without their hash.
-enum class SignatureScheme : unsigned char { kRsaPkcs1, kRsaPss, kEcdsa };
-inline constexpr std::size_t kSignatureSchemeCount = 3;
-
 /// Length of the hash in bytes.
 constexpr std::size_t HashLength(Hash hash) noexcept {
   return std::array<std::size_t, kHashCount>{32, 48, 64}[static_cast<std::size_t>(hash)];
 }
 inline constexpr std::size_t kMaxHashLength = 64;
 
-/// The algorithm, looked up once in the life of the process, since OpenSSL's look-up by name costs
-/// more than hashing a few hundred bytes. Throws `CryptoException` when OpenSSL does not offer it.
+/// OpenSSL's implementation of the hash. It is fetched once per process, since OpenSSL's look-up by
+/// name costs more than hashing a few hundred bytes. Throws `CryptoException` when OpenSSL does not
+/// provide it.
 const EVP_MD* FetchedHash(Hash hash);
 
 }  // namespace Tarnik::Crypto

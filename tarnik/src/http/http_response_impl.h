@@ -1,5 +1,5 @@
-#ifndef TARNIK_HTTP_CLIENT_RESPONSE_H
-#define TARNIK_HTTP_CLIENT_RESPONSE_H
+#ifndef TARNIK_HTTP_HTTP_RESPONSE_IMPL_H
+#define TARNIK_HTTP_HTTP_RESPONSE_IMPL_H
 
 #include <string>
 #include <utility>
@@ -13,6 +13,7 @@ namespace Tarnik::Http {
 /// Header fields in their order, names as written.
 using HeaderFields = std::vector<std::pair<std::string, std::string>>;
 
+/// The only implementation of `ClientResponse`.
 class ClientResponseImpl final : public ClientResponse, public ObjectImpl {
  public:
   ClientResponseImpl(StatusLine status, HeaderFields headers, std::string body);

@@ -1,4 +1,4 @@
-#include "http/connection_pool.h"
+#include "http/idle_connections.h"
 
 #include <algorithm>
 #include <optional>
@@ -19,13 +19,13 @@ void IdleConnections::Discard(const Entry& entry) noexcept {
   entry.connection->Close();
 }
 
-Ref<Connection> IdleConnections::Take(const Place& place) {
+Ref<Connection> IdleConnections::Take(const Endpoint& endpoint) {
   while (true) {
     std::optional<Entry> entry;
     {
       const std::lock_guard guard(mutex_);
       const auto last = std::find_if(entries_.rbegin(), entries_.rend(),
-                                     [&](const Entry& each) { return each.place == place; });
+                                     [&](const Entry& each) { return each.endpoint == endpoint; });
       if (last == entries_.rend()) {
         return nullptr;
       }
@@ -40,28 +40,28 @@ Ref<Connection> IdleConnections::Take(const Place& place) {
   }
 }
 
-void IdleConnections::Put(const Place& place, Ref<Connection> connection) {
+void IdleConnections::Put(const Endpoint& endpoint, Ref<Connection> connection) {
   const std::uint64_t id = NextId();
   const auto drop = [weak = weak_from_this(), id] {
     if (const auto self = weak.lock()) {
       self->Drop(id);
     }
   };
-  // Watched before it can be taken: a connection that nobody watches counts as lost.
+  // Watched before it can be taken: `Claim` takes an unwatched connection for a lost one.
   connection->Watch(drop);
-  Entry entry{id, place, std::move(connection),
+  Entry entry{id, endpoint, std::move(connection),
               System::GetThreadPool()->RunAfter(kMaxIdleMicroseconds, drop)};
-  std::optional<Entry> superfluous;
+  std::optional<Entry> surplus;
   {
     const std::lock_guard guard(mutex_);
-    if (const auto old = Superfluous(place); old != entries_.end()) {
-      superfluous = std::move(*old);
+    if (const auto old = FindSurplus(endpoint); old != entries_.end()) {
+      surplus = std::move(*old);
       entries_.erase(old);
     }
     entries_.push_back(std::move(entry));
   }
-  if (superfluous) {
-    Discard(*superfluous);
+  if (surplus) {
+    Discard(*surplus);
   }
 }
 
@@ -70,11 +70,12 @@ std::uint64_t IdleConnections::NextId() {
   return ++lastId_;
 }
 
-std::vector<IdleConnections::Entry>::iterator IdleConnections::Superfluous(const Place& place) {
-  const auto isHere = [&](const Entry& entry) { return entry.place == place; };
-  const auto here = std::count_if(entries_.begin(), entries_.end(), isHere);
-  if (static_cast<std::size_t>(here) >= kMaxIdlePerPlace) {
-    return std::find_if(entries_.begin(), entries_.end(), isHere);
+std::vector<IdleConnections::Entry>::iterator IdleConnections::FindSurplus(
+    const Endpoint& endpoint) {
+  const auto isSame = [&](const Entry& entry) { return entry.endpoint == endpoint; };
+  const auto count = std::count_if(entries_.begin(), entries_.end(), isSame);
+  if (static_cast<std::size_t>(count) >= kMaxIdlePerEndpoint) {
+    return std::find_if(entries_.begin(), entries_.end(), isSame);
   }
   return entries_.size() >= kMaxIdle ? entries_.begin() : entries_.end();
 }
@@ -92,10 +93,6 @@ void IdleConnections::Drop(std::uint64_t id) {
     entries_.erase(found);
   }
   Discard(*entry);
-}
-
-Ref<ConnectionPool> CreateConnectionPool() {
-  return MakeRef<ConnectionPoolImpl>();
 }
 
 }  // namespace Tarnik::Http

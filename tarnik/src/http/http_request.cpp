@@ -1,11 +1,12 @@
-#include "http/client_request.h"
+#include "http/http_request_impl.h"
 
 #include <algorithm>
 #include <array>
 
 #include <tarnik/core/exception.h>
 
-#include "http/characters.h"
+#include "http/field_syntax.h"
+#include "support/ascii.h"
 
 namespace Tarnik::Http {
 
@@ -52,7 +53,7 @@ void ClientRequestImpl::SetHeader(const std::string& name, const std::string& va
     throw InvalidArgumentException("The name of an HTTP header is not a token.");
   }
   if (IsOwnedByAgent(name)) {
-    throw InvalidArgumentException("The HTTP header " + name + " is set by the user agent alone.");
+    throw InvalidArgumentException("The HTTP header " + name + " is set only by the user agent.");
   }
   if (std::any_of(value.begin(), value.end(), IsControl)) {
     throw InvalidArgumentException("The value of the HTTP header " + name +
@@ -87,7 +88,7 @@ void ClientRequestImpl::MoveTo(const RequestRoute& route, SensitiveText& wire) {
   wire.Append(target_);
   wire.Append(" HTTP/1.1\r\n");
   AppendField(wire, "Host", route.hostField);
-  // RFC 9110, section 8.6: a method that gives meaning to content says its length, even zero.
+  // RFC 9110, section 8.6: a method that defines a meaning for content sends its length, even zero.
   if (method_ == Method::POST || body.Size() != 0) {
     AppendField(wire, "Content-Length", std::to_string(body.Size()));
   }

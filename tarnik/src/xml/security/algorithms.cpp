@@ -1,4 +1,4 @@
-#include "xml/security/algorithm_list.h"
+#include "xml/security/algorithms.h"
 
 #include <tarnik/xml/security/xml_security_exception.h>
 #include <algorithm>
@@ -14,12 +14,13 @@ using Crypto::SignatureScheme;
 
 constexpr std::string_view kEnveloped = "http://www.w3.org/2000/09/xmldsig#enveloped-signature";
 constexpr std::string_view kExclusiveNamespace = "http://www.w3.org/2001/10/xml-exc-c14n#";
-struct ListedSignatureMethod {
+
+struct SupportedSignatureMethod {
   std::string_view algorithm;
   SignatureMethod method;
 };
 
-constexpr ListedSignatureMethod kSignatureMethods[] = {
+constexpr SupportedSignatureMethod kSignatureMethods[] = {
     {"http://www.w3.org/2001/04/xmldsig-more#rsa-sha256",
      {SignatureScheme::kRsaPkcs1, Hash::kSha256}},
     {"http://www.w3.org/2001/04/xmldsig-more#rsa-sha384",
@@ -40,12 +41,12 @@ constexpr ListedSignatureMethod kSignatureMethods[] = {
      {SignatureScheme::kEcdsa, Hash::kSha512}},
 };
 
-struct ListedDigestMethod {
+struct SupportedDigestMethod {
   std::string_view algorithm;
   Hash hash;
 };
 
-constexpr ListedDigestMethod kDigestMethods[] = {
+constexpr SupportedDigestMethod kDigestMethods[] = {
     {"http://www.w3.org/2001/04/xmlenc#sha256", Hash::kSha256},
     {"http://www.w3.org/2001/04/xmldsig-more#sha384", Hash::kSha384},
     {"http://www.w3.org/2001/04/xmlenc#sha512", Hash::kSha512},
@@ -57,10 +58,10 @@ constexpr ListedDigestMethod kDigestMethods[] = {
 }
 
 template <class List>
-auto Require(const List& list, std::string_view algorithm, const char* kind) {
-  for (const auto& listed : list) {
-    if (listed.algorithm == algorithm) {
-      return listed;
+auto LookUp(const List& list, std::string_view algorithm, const char* kind) {
+  for (const auto& supported : list) {
+    if (supported.algorithm == algorithm) {
+      return supported;
     }
   }
   Refuse(algorithm, kind);
@@ -105,7 +106,7 @@ std::vector<std::string> InclusivePrefixesOf(std::string_view algorithm,
   return prefixes ? SplitPrefixes(*prefixes) : std::vector<std::string>();
 }
 
-C14nOptions RequireC14n(std::string_view algorithm, const ElementNode* element, const char* kind) {
+C14nOptions LookUpC14n(std::string_view algorithm, const ElementNode* element, const char* kind) {
   C14nOptions options;
   if (!ReadC14nAlgorithm(algorithm, options)) {
     Refuse(algorithm, kind);
@@ -120,24 +121,24 @@ C14nOptions RequireC14n(std::string_view algorithm, const ElementNode* element, 
 
 }  // namespace
 
-SignatureMethod RequireSignatureMethod(std::string_view algorithm, const ElementNode* element) {
-  const SignatureMethod method = Require(kSignatureMethods, algorithm, "signature").method;
+SignatureMethod LookUpSignatureMethod(std::string_view algorithm, const ElementNode* element) {
+  const SignatureMethod method = LookUp(kSignatureMethods, algorithm, "signature").method;
   ExpectNoParameters(algorithm, element);
   return method;
 }
 
-Hash RequireDigestMethod(std::string_view algorithm, const ElementNode* element) {
-  const Hash hash = Require(kDigestMethods, algorithm, "digest").hash;
+Hash LookUpDigestMethod(std::string_view algorithm, const ElementNode* element) {
+  const Hash hash = LookUp(kDigestMethods, algorithm, "digest").hash;
   ExpectNoParameters(algorithm, element);
   return hash;
 }
 
-C14nOptions RequireCanonicalizationMethod(std::string_view algorithm, const ElementNode* element) {
-  return RequireC14n(algorithm, element, "canonicalization");
+C14nOptions LookUpCanonicalizationMethod(std::string_view algorithm, const ElementNode* element) {
+  return LookUpC14n(algorithm, element, "canonicalisation");
 }
 
-TransformPlan RequireTransforms(const std::vector<std::string>& algorithms,
-                                const std::vector<const ElementNode*>& elements) {
+TransformPlan PlanTransforms(const std::vector<std::string>& algorithms,
+                             const std::vector<const ElementNode*>& elements) {
   TransformPlan plan;
   std::size_t next = 0;
   if (next < algorithms.size() && algorithms[next] == kEnveloped) {
@@ -146,12 +147,12 @@ TransformPlan RequireTransforms(const std::vector<std::string>& algorithms,
     ++next;
   }
   if (next < algorithms.size()) {
-    plan.canonicalization = RequireC14n(algorithms[next], elements[next], "transform");
+    plan.canonicalization = LookUpC14n(algorithms[next], elements[next], "transform");
     ++next;
   }
   if (next < algorithms.size()) {
     throw XmlSecurityException("The transform algorithm " + Quote(algorithms[next]) +
-                               " is not supported behind a canonicalization.");
+                               " is not supported after a canonicalisation.");
   }
   return plan;
 }

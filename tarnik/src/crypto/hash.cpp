@@ -1,4 +1,4 @@
-#include "crypto/algorithms.h"
+#include "crypto/hash.h"
 
 #include <tarnik/crypto/crypto_exception.h>
 #include <string>
@@ -22,7 +22,7 @@ const EVP_MD* Fetch(Hash hash) {
 
 }  // namespace
 
-// The algorithms are never freed: threads may use them while the process ends.
+// The implementations are never freed, since threads may use them while the process ends.
 const EVP_MD* FetchedHash(Hash hash) {
   switch (hash) {
     case Hash::kSha256: {

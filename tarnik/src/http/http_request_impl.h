@@ -1,5 +1,5 @@
-#ifndef TARNIK_HTTP_CLIENT_REQUEST_H
-#define TARNIK_HTTP_CLIENT_REQUEST_H
+#ifndef TARNIK_HTTP_HTTP_REQUEST_IMPL_H
+#define TARNIK_HTTP_HTTP_REQUEST_IMPL_H
 
 #include <atomic>
 #include <string>
@@ -13,7 +13,7 @@
 
 namespace Tarnik::Http {
 
-/// What a request says about where it goes; the agent's part of it.
+/// The parts of a request that the agent adds for the connection in use.
 struct RequestRoute {
   /// The Host field: host, and port unless it is the scheme's own (RFC 9110, section 7.2).
   std::string hostField;
@@ -26,6 +26,7 @@ struct RequestRoute {
 
 class RequestBody;
 
+/// The only implementation of `ClientRequest`.
 class ClientRequestImpl final : public ClientRequest, public ObjectImpl {
  public:
   ClientRequestImpl(Method method, std::string target);
@@ -34,9 +35,9 @@ class ClientRequestImpl final : public ClientRequest, public ObjectImpl {
   Ref<Writer> BodyWriter() override;
 
   const std::string& Target() const noexcept { return target_; }
-  /// Throws `InvalidStateException` from the second time on.
+  /// Throws `InvalidStateException` from the second call on.
   void MarkSent();
-  /// Writes head and body (RFC 9112, section 3) into `wire` and forgets the body.
+  /// Appends head and body (RFC 9112, section 3) to `wire` and clears the body.
   void MoveTo(const RequestRoute& route, SensitiveText& wire);
 
  private:

@@ -1,6 +1,6 @@
-#include "http/client_response.h"
+#include "http/http_response_impl.h"
 
-#include "http/characters.h"
+#include "support/ascii.h"
 
 namespace Tarnik::Http {
 
