@@ -15,7 +15,7 @@
 namespace {
 
 using namespace Tarnik;
-using TestSupport::OracleRequest;
+using Tarnik::Testing::OracleRequest;
 
 constexpr int kElements = 3;
 const std::vector<std::string> kPrefixes{"#default", "a", "b", "ds"};
@@ -65,7 +65,7 @@ void Compare(const std::string& text, const Xml::Document& document) {
       node = elements[index];
     }
     const auto ours = Ours(*node, request);
-    const auto theirs = TestSupport::CanonicalizeWithLibXml2(text, request);
+    const auto theirs = Tarnik::Testing::CanonicalizeWithLibXml2(text, request);
     Fuzz::Require(ours && ours == theirs);
   }
 }
@@ -95,7 +95,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   if (Fuzz::HasOddNamespace(*document)) {
     return 0;
   }
-  Fuzz::Require(TestSupport::IsWellFormedForLibXml2(text));
+  Fuzz::Require(Tarnik::Testing::IsWellFormedForLibXml2(text));
   if (Fuzz::HasRelativeNamespace(*document)) {
     Fuzz::Require(!Ours(*document, {}));
     return 0;

@@ -48,7 +48,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   Fuzz::Require(token->Xml() == text);
   const std::string values = TestSupport::AllValues(*token);
   if (!Fuzz::HasOddNamespace(*Fuzz::ParseXml(text))) {
-    Fuzz::Require(Tarnik::TestSupport::IsWellFormedForLibXml2(text));
+    Fuzz::Require(Tarnik::Testing::IsWellFormedForLibXml2(text));
   }
   const auto fromTree = ReadTree(text);
   if (fromTree == nullptr) {

@@ -1,9 +1,10 @@
+#include <gtest/gtest.h>
 #include <tarnik/core/reader.h>
 #include <tarnik/core/writer.h>
 
-#include <gtest/gtest.h>
+#include <string>
 
-namespace Tarnik {
+namespace Tarnik::Testing {
 namespace {
 
 TEST(StringReaderTest, ReadsInPiecesToTheEnd) {
@@ -24,7 +25,7 @@ TEST(StringReaderTest, KeepsNulBytes) {
   EXPECT_EQ(std::string(buffer, 3), std::string("a\0b", 3));
 }
 
-TEST(StringReaderTest, EmptyTextIsAtItsEnd) {
+TEST(StringReaderTest, EmptyTextEndsAtOnce) {
   char buffer[1];
   EXPECT_EQ(CreateStringReader("")->Read(buffer, 1), 0U);
 }
@@ -49,4 +50,4 @@ TEST(StringWriterTest, TakeTextLeavesItEmpty) {
 }
 
 }  // namespace
-}  // namespace Tarnik
+}  // namespace Tarnik::Testing

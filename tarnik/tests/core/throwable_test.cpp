@@ -1,16 +1,19 @@
 #include <tarnik/core/throwable.h>
 
 #include <gmock/gmock.h>
-
-#include <cstring>
-
+#include <gtest/gtest.h>
 #include <tarnik/core/exception.h>
 
-namespace Tarnik {
+#include <cstring>
+#include <memory>
+#include <string>
+#include <typeinfo>
+
+namespace Tarnik::Testing {
 namespace {
 
-using ::testing::EndsWith;
-using ::testing::HasSubstr;
+using testing::EndsWith;
+using testing::HasSubstr;
 
 // Slot `index` of the object's primary virtual table (Itanium C++ ABI, section 2.5).
 void* Slot(const void* object, int index) {
@@ -19,7 +22,7 @@ void* Slot(const void* object, int index) {
   return table[index];
 }
 
-TEST(ThrowableTest, SlotsStandInTheirOrder) {
+TEST(ThrowableTest, KeepsTheOrderOfItsVtableSlots) {
   const InvalidStateException exception("the message");
   const auto what = reinterpret_cast<const char* (*)(const void*)>(Slot(&exception, 2));
   EXPECT_STREQ(what(&exception), "the message");
@@ -36,7 +39,7 @@ TEST(ThrowableTest, SlotsStandInTheirOrder) {
   EXPECT_THROW(raise(&exception), InvalidStateException);
 }
 
-TEST(ThrowableTest, TellsWhereItWasMade) {
+TEST(ThrowableTest, RecordsWhereItWasCreated) {
   const Exception exception("x");
   const auto line = static_cast<unsigned>(__LINE__ - 1);
   EXPECT_EQ(exception.Where().line(), line);
@@ -56,12 +59,12 @@ TEST(ThrowableTest, CopiesShareTheMessage) {
 }
 
 template <class Class>
-class ExceptionClassTest : public ::testing::Test {};
+class ExceptionClassTest : public testing::Test {};
 
 using ExceptionClasses =
-    ::testing::Types<Exception, InvalidArgumentException, InvalidStateException,
-                     TypeMismatchException, DateTimeFormatException, Base64FormatException,
-                     IOException, TimeoutException, CancelledException>;
+    testing::Types<Exception, InvalidArgumentException, InvalidStateException,
+                   TypeMismatchException, DateTimeFormatException, Base64FormatException,
+                   IOException, TimeoutException, CancelledException>;
 TYPED_TEST_SUITE(ExceptionClassTest, ExceptionClasses);
 
 TYPED_TEST(ExceptionClassTest, CloneAndThrowKeepTheExactClass) {
@@ -79,10 +82,10 @@ TYPED_TEST(ExceptionClassTest, CloneAndThrowKeepTheExactClass) {
   }
 }
 
-TEST(ExceptionTest, TimeoutAndCancellationAreIoFailures) {
+TEST(ExceptionTest, TimeoutAndCancellationAreIOExceptions) {
   EXPECT_THROW(throw TimeoutException("t"), IOException);
   EXPECT_THROW(throw CancelledException("c"), IOException);
 }
 
 }  // namespace
-}  // namespace Tarnik
+}  // namespace Tarnik::Testing

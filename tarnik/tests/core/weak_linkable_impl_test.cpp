@@ -1,19 +1,21 @@
 #include <tarnik/core/weak_linkable_impl.h>
 
 #include <gtest/gtest.h>
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
 
 #include <atomic>
+#include <string>
 #include <thread>
 #include <vector>
 
-#include <tarnik/core/checked_cast.h>
-
-namespace Tarnik {
+namespace Tarnik::Testing {
 namespace {
 
 class Probe : public WeakLinkableImpl<ObjectImpl> {
  public:
-  explicit Probe(int& deaths) : deaths_(deaths) {}
+  explicit Probe(int& destructions) : destructions_(destructions) {}
   void OnFirstRef() const noexcept override { ++firstRefs; }
   void OnLastRef() const noexcept override { ++lastRefs; }
 
@@ -21,34 +23,34 @@ class Probe : public WeakLinkableImpl<ObjectImpl> {
   static inline std::atomic<int> lastRefs{0};
 
  private:
-  ~Probe() override { ++deaths_; }
-  int& deaths_;
+  ~Probe() override { ++destructions_; }
+  int& destructions_;
 };
 
-TEST(ObjectImplTest, DiesWithItsLastReferenceAndTellsOfIt) {
+TEST(ObjectImplTest, IsDestroyedWithItsLastReferenceAndCallsTheHooks) {
   Probe::firstRefs = 0;
   Probe::lastRefs = 0;
-  int deaths = 0;
-  Ref<Probe> first = MakeRef<Probe>(deaths);
+  int destructions = 0;
+  Ref<Probe> first = MakeRef<Probe>(destructions);
   EXPECT_EQ(first->RefCount(), 1);
   Ref<Probe> second = first;
   EXPECT_EQ(first->RefCount(), 2);
   first.reset();
-  EXPECT_EQ(deaths, 0);
+  EXPECT_EQ(destructions, 0);
   second.reset();
-  EXPECT_EQ(deaths, 1);
+  EXPECT_EQ(destructions, 1);
   EXPECT_EQ(Probe::firstRefs, 1);
   EXPECT_EQ(Probe::lastRefs, 1);
 }
 
 TEST(ObjectImplTest, ToStringNamesTheClass) {
-  int deaths = 0;
-  EXPECT_NE(MakeRef<Probe>(deaths)->ToString().find("Probe"), std::string::npos);
+  int destructions = 0;
+  EXPECT_NE(MakeRef<Probe>(destructions)->ToString().find("Probe"), std::string::npos);
 }
 
-TEST(WeakLinkableImplTest, WeakReferenceFollowsTheObjectsLife) {
-  int deaths = 0;
-  Ref<Probe> object = MakeRef<Probe>(deaths);
+TEST(WeakLinkableImplTest, WeakReferenceFollowsTheObjectsLifetime) {
+  int destructions = 0;
+  Ref<Probe> object = MakeRef<Probe>(destructions);
   EXPECT_FALSE(object->HasLink());
   WeakRef weak;
   EXPECT_EQ(weak.Lock(), nullptr);
@@ -57,14 +59,14 @@ TEST(WeakLinkableImplTest, WeakReferenceFollowsTheObjectsLife) {
   EXPECT_EQ(weak.Lock().get(), static_cast<const Object*>(object.get()));
   EXPECT_EQ(object->RefCount(), 1);
   object.reset();
-  EXPECT_EQ(deaths, 1);
+  EXPECT_EQ(destructions, 1);
   EXPECT_EQ(weak.Lock(), nullptr);
 }
 
 TEST(WeakLinkableImplTest, ConcurrentLockingNeverRevivesADyingObject) {
   for (int round = 0; round < 200; ++round) {
-    int deaths = 0;
-    Ref<Probe> object = MakeRef<Probe>(deaths);
+    int destructions = 0;
+    Ref<Probe> object = MakeRef<Probe>(destructions);
     WeakRef weak;
     object->AttachWeakRef(weak);
     std::vector<std::thread> threads;
@@ -79,13 +81,13 @@ TEST(WeakLinkableImplTest, ConcurrentLockingNeverRevivesADyingObject) {
     for (auto& thread : threads) {
       thread.join();
     }
-    EXPECT_EQ(deaths, 1);
+    EXPECT_EQ(destructions, 1);
   }
 }
 
 TEST(CheckedCastTest, RefusesAnotherClassAndNull) {
-  int deaths = 0;
-  const Ref<Probe> object = MakeRef<Probe>(deaths);
+  int destructions = 0;
+  const Ref<Probe> object = MakeRef<Probe>(destructions);
   Object* base = object.get();
   EXPECT_EQ(CheckedCast<Probe>(base), object.get());
   class Other : public ObjectImpl {};
@@ -94,4 +96,4 @@ TEST(CheckedCastTest, RefusesAnotherClassAndNull) {
 }
 
 }  // namespace
-}  // namespace Tarnik
+}  // namespace Tarnik::Testing

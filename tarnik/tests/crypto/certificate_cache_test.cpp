@@ -2,20 +2,25 @@
 
 #include <gtest/gtest.h>
 
+#include <string>
+#include <string_view>
+
 #include "support/test_certificates.h"
 
-namespace Tarnik::Crypto {
+namespace Tarnik::Testing {
 namespace {
 
+using namespace Tarnik::Crypto;
+
 Ref<const Certificate> Make(const char* name) {
-  return Tests::MakeCertificate({.commonName = name});
+  return MakeCertificate({.commonName = name});
 }
 
 std::string_view BytesOf(const Ref<const Certificate>& certificate) {
   return {reinterpret_cast<const char*>(certificate->DerBytes()), certificate->DerLength()};
 }
 
-TEST(CertificateCache, FindsByEqualBytes) {
+TEST(CertificateCacheTest, FindsByEqualBytes) {
   CertificateCache cache(2);
   const auto one = Make("one");
   EXPECT_EQ(cache.Find(BytesOf(one)), nullptr);
@@ -23,7 +28,7 @@ TEST(CertificateCache, FindsByEqualBytes) {
   EXPECT_EQ(cache.Find(std::string(BytesOf(one))), one);
 }
 
-TEST(CertificateCache, DropsTheOneNotUsedForTheLongestTime) {
+TEST(CertificateCacheTest, DropsTheLeastRecentlyUsedCertificate) {
   CertificateCache cache(2);
   const auto one = Make("one");
   const auto two = Make("two");
@@ -38,7 +43,7 @@ TEST(CertificateCache, DropsTheOneNotUsedForTheLongestTime) {
   EXPECT_EQ(cache.Find(BytesOf(three)), three);
 }
 
-TEST(CertificateCache, KeepsOneOfEqualCertificates) {
+TEST(CertificateCacheTest, KeepsOneOfEqualCertificates) {
   CertificateCache cache(2);
   const auto one = Make("one");
   cache.Add(one);
@@ -46,7 +51,7 @@ TEST(CertificateCache, KeepsOneOfEqualCertificates) {
   EXPECT_EQ(cache.Size(), 1U);
 }
 
-TEST(CertificateCache, OfTheProcessIsBounded) {
+TEST(CertificateCacheTest, ProcessCacheIsBounded) {
   for (int i = 0; i < 300; ++i) {
     Make(std::to_string(i).c_str());
   }
@@ -54,4 +59,4 @@ TEST(CertificateCache, OfTheProcessIsBounded) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Crypto
+}  // namespace Tarnik::Testing

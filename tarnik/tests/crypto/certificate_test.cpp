@@ -4,24 +4,27 @@
 #include <gtest/gtest.h>
 #include <openssl/err.h>
 #include <openssl/pem.h>
-
+#include <tarnik/core/exception.h>
 #include <tarnik/crypto/crypto_exception.h>
+
 #include <atomic>
-#include <cstdio>
-#include <fstream>
+#include <cstddef>
+#include <string>
 #include <thread>
+#include <vector>
 
+#include "support/openssl.h"
 #include "support/test_certificates.h"
+#include "support/test_pki.h"
+#include "support/thrown_message.h"
 
-namespace Tarnik::Crypto {
+namespace Tarnik::Testing {
 namespace {
 
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-using ::testing::StartsWith;
-using Tests::CertificateRecipe;
-using Tests::MakeCertificate;
-using Tests::MakeCertificateDer;
+using namespace Tarnik::Crypto;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::StartsWith;
 
 std::string ToPem(const std::vector<unsigned char>& der, const char* label = "CERTIFICATE") {
   const OpenSsl::OwnedBio memory(BIO_new(BIO_s_mem()));
@@ -32,24 +35,15 @@ std::string ToPem(const std::vector<unsigned char>& der, const char* label = "CE
 }
 
 std::string DecodeError(const std::vector<unsigned char>& der) {
-  try {
-    CreateCertificateFromDer(der.data(), der.size());
-  } catch (const CryptoException& error) {
-    return error.Message();
-  }
-  return "accepted";
+  return ThrownMessage<CryptoException>(
+      [&der] { CreateCertificateFromDer(der.data(), der.size()); }, "accepted");
 }
 
 std::string PemError(const std::string& pem) {
-  try {
-    CreateCertificatesFromPem(pem);
-  } catch (const CryptoException& error) {
-    return error.Message();
-  }
-  return "accepted";
+  return ThrownMessage<CryptoException>([&pem] { CreateCertificatesFromPem(pem); }, "accepted");
 }
 
-TEST(Certificate, TellsItsFields) {
+TEST(CertificateTest, ReturnsItsFields) {
   const auto certificate = MakeCertificate({.commonName = "J\xC3\xBCrgen",
                                             .issuerCommonName = "issuer",
                                             .serial = "340282366920938463463374607431768211455"});
@@ -61,19 +55,19 @@ TEST(Certificate, TellsItsFields) {
   EXPECT_EQ(certificate->ToString(), "Certificate of CN=J\xC3\xBCrgen,O=Test\\, Inc.");
 }
 
-TEST(Certificate, EscapesControlCharactersInNames) {
+TEST(CertificateTest, EscapesControlCharactersInNames) {
   const auto certificate = MakeCertificate({.commonName = std::string("a\0b", 3)});
   EXPECT_EQ(certificate->SubjectName(), "CN=a\\00b,O=Test\\, Inc.");
 }
 
-TEST(Certificate, TellsTimesBefore1970AndAtTheEndOfTheCalendar) {
+TEST(CertificateTest, ReturnsTimesBefore1970AndAtTheEndOfTheCalendar) {
   const auto certificate =
       MakeCertificate({.notBefore = "19500101000000Z", .notAfter = "99991231235959Z"});
   EXPECT_EQ(certificate->NotBefore().ToString(), "1950-01-01T00:00:00.000Z");
   EXPECT_EQ(certificate->NotAfter().ToString(), "9999-12-31T23:59:59.000Z");
 }
 
-TEST(Certificate, GivesItsBytesAsTheyCame) {
+TEST(CertificateTest, ReturnsItsBytesUnchanged) {
   const auto der = MakeCertificateDer();
   const auto certificate = CreateCertificateFromDer(der.data(), der.size());
   EXPECT_EQ(std::vector<unsigned char>(certificate->DerBytes(),
@@ -81,23 +75,23 @@ TEST(Certificate, GivesItsBytesAsTheyCame) {
             der);
 }
 
-TEST(Certificate, TellsTheSubjectKeyIdentifier) {
+TEST(CertificateTest, ReturnsTheSubjectKeyIdentifier) {
   EXPECT_EQ(MakeCertificate({.withKeyIdentifier = true})->SubjectKeyIdentifier().size(), 20U);
   EXPECT_THAT(MakeCertificate()->SubjectKeyIdentifier(), IsEmpty());
 }
 
-TEST(Certificate, IsNotDecodedAgainWhenItsBytesAreKnown) {
+TEST(CertificateTest, IsNotDecodedAgainWhenItsBytesAreKnown) {
   const auto der = MakeCertificateDer({.commonName = "decoded once"});
   const auto copy = der;
   const auto first = CreateCertificateFromDer(der.data(), der.size());
   EXPECT_EQ(first, CreateCertificateFromDer(copy.data(), copy.size()));
 }
 
-TEST(Certificate, DiffersFromOneWithOtherBytes) {
+TEST(CertificateTest, DiffersFromOneWithOtherBytes) {
   EXPECT_NE(MakeCertificate({.commonName = "one"}), MakeCertificate({.commonName = "two"}));
 }
 
-TEST(Certificate, RefusesEveryShorterPiece) {
+TEST(CertificateTest, RefusesEveryProperPrefix) {
   auto der = MakeCertificateDer();
   while (!der.empty()) {
     der.pop_back();
@@ -106,18 +100,18 @@ TEST(Certificate, RefusesEveryShorterPiece) {
   EXPECT_EQ(DecodeError({}), "A certificate cannot be empty.");
 }
 
-TEST(Certificate, RefusesTrailingBytes) {
+TEST(CertificateTest, RefusesTrailingBytes) {
   auto der = MakeCertificateDer();
   ASSERT_EQ(DecodeError(der), "accepted");
   der.push_back(0);
   EXPECT_EQ(DecodeError(der), "The certificate is followed by other bytes.");
 }
 
-TEST(Certificate, NamesWhatCannotBeDecodedAndWhy) {
+TEST(CertificateTest, ReportsWhyItCannotBeDecoded) {
   EXPECT_THAT(DecodeError({'n', 'o', 'n', 'e'}), StartsWith("The certificate cannot be decoded: "));
 }
 
-TEST(Certificate, LeavesTheErrorQueueAsItWas) {
+TEST(CertificateTest, LeavesTheErrorQueueUnchanged) {
   ERR_clear_error();
   DecodeError({'n', 'o', 'n', 'e'});
   PemError("-----BEGIN CERTIFICATE-----\n");
@@ -138,9 +132,9 @@ struct KeyCase {
   int bits;
 };
 
-class CertificateKey : public ::testing::TestWithParam<KeyCase> {};
+class CertificateKeyTest : public testing::TestWithParam<KeyCase> {};
 
-TEST_P(CertificateKey, TellsAlgorithmAndSize) {
+TEST_P(CertificateKeyTest, ReportsAlgorithmAndSize) {
   const OpenSsl::OwnedKey key = GetParam().make();
   const auto publicKey = MakeCertificate({.key = key.get()})->GetPublicKey();
   EXPECT_EQ(publicKey->Algorithm(), GetParam().algorithm);
@@ -148,16 +142,16 @@ TEST_P(CertificateKey, TellsAlgorithmAndSize) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Keys, CertificateKey,
-    ::testing::Values(
-        KeyCase{"Rsa1024", [] { return Tests::MakeRsaKey(1024); }, KeyAlgorithm::kRsa, 1024},
-        KeyCase{"Rsa2048", [] { return Tests::MakeRsaKey(2048); }, KeyAlgorithm::kRsa, 2048},
-        KeyCase{"P256", [] { return Tests::MakeEcKey("P-256"); }, KeyAlgorithm::kEc, 256},
-        KeyCase{"P521", [] { return Tests::MakeEcKey("P-521"); }, KeyAlgorithm::kEc, 521},
-        KeyCase{"Ed25519", [] { return Tests::MakeKey("ED25519"); }, KeyAlgorithm::kOther, 256}),
+    Keys, CertificateKeyTest,
+    testing::Values(KeyCase{"Rsa1024", [] { return MakeRsaKey(1024); }, KeyAlgorithm::kRsa, 1024},
+                    KeyCase{"Rsa2048", [] { return MakeRsaKey(2048); }, KeyAlgorithm::kRsa, 2048},
+                    KeyCase{"P256", [] { return MakeEcKey("P-256"); }, KeyAlgorithm::kEc, 256},
+                    KeyCase{"P521", [] { return MakeEcKey("P-521"); }, KeyAlgorithm::kEc, 521},
+                    KeyCase{"Ed25519", [] { return MakeKey("ED25519"); }, KeyAlgorithm::kOther,
+                            256}),
     [](const auto& tested) { return tested.param.name; });
 
-TEST(Certificate, KeepsItsPublicKeyAliveWithoutItself) {
+TEST(CertificateTest, PublicKeyOutlivesIt) {
   auto certificate = MakeCertificate({.commonName = "short-lived"});
   const auto key = certificate->GetPublicKey();
   EXPECT_EQ(key, certificate->GetPublicKey());
@@ -165,7 +159,7 @@ TEST(Certificate, KeepsItsPublicKeyAliveWithoutItself) {
   EXPECT_EQ(key->Bits(), 2048);
 }
 
-TEST(CertificatesFromPem, ReadsEveryCertificateInOrderAndSkipsOtherBlocks) {
+TEST(CertificatesFromPemTest, ReadsEveryCertificateInOrderAndSkipsOtherBlocks) {
   const auto one = MakeCertificateDer({.commonName = "one"});
   const auto two = MakeCertificateDer({.commonName = "two"});
   const auto certificates = CreateCertificatesFromPem(
@@ -175,13 +169,13 @@ TEST(CertificatesFromPem, ReadsEveryCertificateInOrderAndSkipsOtherBlocks) {
   EXPECT_EQ(certificates[1]->SubjectName(), "CN=two,O=Test\\, Inc.");
 }
 
-TEST(CertificatesFromPem, RefusesTextWithoutCertificates) {
+TEST(CertificatesFromPemTest, RefusesTextWithoutCertificates) {
   EXPECT_EQ(PemError(""), "The PEM text holds no certificate.");
   EXPECT_EQ(PemError("nothing here"), "The PEM text holds no certificate.");
   EXPECT_EQ(PemError(ToPem({1, 2, 3}, "PUBLIC KEY")), "The PEM text holds no certificate.");
 }
 
-TEST(CertificatesFromPem, RefusesABrokenBlockBesideGoodOnes) {
+TEST(CertificatesFromPemTest, RefusesABrokenBlockNextToValidOnes) {
   const std::string good = ToPem(MakeCertificateDer());
   EXPECT_EQ(PemError(good + good), "accepted");
   EXPECT_THAT(PemError(good + good.substr(0, good.size() / 2)),
@@ -189,58 +183,32 @@ TEST(CertificatesFromPem, RefusesABrokenBlockBesideGoodOnes) {
   EXPECT_THAT(PemError(good + ToPem({1, 2, 3})), StartsWith("The certificate cannot be decoded"));
 }
 
-class LoadedCertificates : public ::testing::Test {
- protected:
-  void SetUp() override {
-    std::string name = ::testing::TempDir() + "certificates-XXXXXX";
-    const int descriptor = mkstemp(name.data());
-    ASSERT_GE(descriptor, 0);
-    close(descriptor);
-    path_ = name;
-  }
-  void TearDown() override { std::remove(path_.c_str()); }
-
-  std::string path_;
-};
-
-TEST_F(LoadedCertificates, AreThoseOfTheFile) {
-  std::ofstream(path_) << ToPem(MakeCertificateDer({.commonName = "from a file"}));
-  const auto certificates = LoadCertificates(path_);
+TEST(LoadCertificatesTest, ReturnsTheCertificatesOfTheFile) {
+  const TemporaryFile file(ToPem(MakeCertificateDer({.commonName = "from a file"})));
+  const auto certificates = LoadCertificates(file.Path());
   ASSERT_EQ(certificates.size(), 1U);
   EXPECT_EQ(certificates[0]->SubjectName(), "CN=from a file,O=Test\\, Inc.");
 }
 
-TEST_F(LoadedCertificates, AreRefusedWhenTheFileHoldsNone) {
-  try {
-    LoadCertificates(path_);
-    FAIL() << "accepted";
-  } catch (const CryptoException& error) {
-    EXPECT_EQ(error.Message(), "The certificate file '" + path_ +
-                                   "' cannot be used: The PEM text holds no certificate.");
-  }
+TEST(LoadCertificatesTest, RefusesAFileWithoutCertificates) {
+  const TemporaryFile file("");
+  EXPECT_EQ(ThrownMessage<CryptoException>([&file] { LoadCertificates(file.Path()); }),
+            "The certificate file '" + file.Path() +
+                "' cannot be used: The PEM text holds no certificate.");
 }
 
-TEST(LoadCertificates, NamesTheFileThatCannotBeRead) {
-  try {
-    LoadCertificates("/nonexistent/ca.pem");
-    FAIL() << "accepted";
-  } catch (const IOException& error) {
-    EXPECT_EQ(error.Message(),
-              "The certificate file '/nonexistent/ca.pem' cannot be read: No such file or "
-              "directory.");
-  }
+TEST(LoadCertificatesTest, NamesTheFileThatCannotBeRead) {
+  EXPECT_EQ(ThrownMessage<IOException>([] { LoadCertificates("/nonexistent/ca.pem"); }),
+            "The certificate file '/nonexistent/ca.pem' cannot be read: No such file or "
+            "directory.");
 }
 
-TEST(LoadCertificates, RefusesADirectory) {
-  try {
-    LoadCertificates("/");
-    FAIL() << "accepted";
-  } catch (const IOException& error) {
-    EXPECT_THAT(error.Message(), HasSubstr("Is a directory"));
-  }
+TEST(LoadCertificatesTest, RefusesADirectory) {
+  EXPECT_THAT(ThrownMessage<IOException>([] { LoadCertificates("/"); }),
+              HasSubstr("Is a directory"));
 }
 
-TEST(Certificate, MayBeMadeByManyThreadsAtOnce) {
+TEST(CertificateTest, MayBeCreatedByManyThreadsAtOnce) {
   std::vector<std::vector<unsigned char>> encodings;
   for (int i = 0; i < 4; ++i) {
     encodings.push_back(MakeCertificateDer({.commonName = "shared " + std::to_string(i)}));
@@ -263,4 +231,4 @@ TEST(Certificate, MayBeMadeByManyThreadsAtOnce) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Crypto
+}  // namespace Tarnik::Testing

@@ -1,24 +1,23 @@
 #include <gtest/gtest.h>
 
-#include <tarnik/crypto/private_key.h>
 #include <memory>
 #include <string>
 
+#include "support/algorithm_uris.h"
 #include "support/software_tpm.h"
+#include "support/test_certificates.h"
 
-namespace Tarnik::Crypto {
+namespace Tarnik::Testing {
 namespace {
 
-using Testing::SoftwareTpm;
+using namespace Tarnik::Crypto;
 
 constexpr const char* kPin = "4711";
 constexpr const char* kRsaKey = "handle:0x81000001?pass";
 constexpr const char* kEcKey = "handle:0x81000002?pass";
-constexpr const char* kRsaSha256 = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
-constexpr const char* kEcdsaSha256 = "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha256";
 
-/// Keys in a TPM, through OpenSSL's provider for it.
-class DeviceKey : public testing::Test {
+/// Keys in a TPM, used through OpenSSL's provider for TPMs.
+class DeviceKeyTest : public testing::Test {
  protected:
   static void SetUpTestSuite() {
     if (!SoftwareTpm::IsInstalled()) {
@@ -46,29 +45,29 @@ class DeviceKey : public testing::Test {
   static inline std::unique_ptr<SoftwareTpm> tpm_;
 };
 
-TEST_F(DeviceKey, SignsAfterOneQuestionForThePin) {
+TEST_F(DeviceKeyTest, SignsAfterAskingForThePinOnce) {
   EXPECT_EQ(Sign(kRsaKey, kRsaSha256, kPin), "verified, asked 1 times\n");
   EXPECT_EQ(Sign(kEcKey, kEcdsaSha256, kPin), "verified, asked 1 times\n");
 }
 
-TEST_F(DeviceKey, IsNotLoadedWithoutAPin) {
+TEST_F(DeviceKeyTest, IsNotLoadedWithoutAPin) {
   EXPECT_EQ(Sign(kRsaKey, kRsaSha256), "The private key needs a passphrase, and none was given.\n");
 }
 
-TEST_F(DeviceKey, DoesNotSignWithAWrongPin) {
+TEST_F(DeviceKeyTest, DoesNotSignWithAWrongPin) {
   EXPECT_EQ(Sign(kRsaKey, kRsaSha256, "1234"), "The signature cannot be made: cannot sign.\n");
 }
 
-TEST_F(DeviceKey, IsCheckedAgainstTheAlgorithmBeforeTheDeviceIsAsked) {
+TEST_F(DeviceKeyTest, IsCheckedAgainstTheAlgorithmBeforeTheDeviceIsUsed) {
   EXPECT_EQ(Sign(kEcKey, kRsaSha256, kPin),
             std::string("The private key is an EC key; the signature algorithm '") + kRsaSha256 +
                 "' needs an RSA key.\n");
 }
 
-TEST_F(DeviceKey, IsMissedUnderAnotherHandle) {
+TEST_F(DeviceKeyTest, IsNotFoundUnderAnotherHandle) {
   EXPECT_EQ(Sign("handle:0x81000009", kRsaSha256, kPin),
             "The URI 'handle:' gives no private key: cannot load key.\n");
 }
 
 }  // namespace
-}  // namespace Tarnik::Crypto
+}  // namespace Tarnik::Testing

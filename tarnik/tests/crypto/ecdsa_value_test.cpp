@@ -2,39 +2,39 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-
 #include <tarnik/crypto/crypto_exception.h>
 
-namespace Tarnik::Crypto {
+namespace Tarnik::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using namespace Tarnik::Crypto;
+using testing::ElementsAre;
+using testing::IsEmpty;
 
-TEST(EcdsaValue, IsWrittenAsTwoShortestIntegers) {
+TEST(EcdsaValueTest, IsWrittenAsTwoIntegersOfMinimalLength) {
   EXPECT_THAT(DerFromRawEcdsa({0, 1, 0x80, 0}, 2),
               ElementsAre(0x30, 8, 0x02, 1, 1, 0x02, 3, 0, 0x80, 0));
 }
 
-TEST(EcdsaValue, MustBeExactlyTwoOrdersLong) {
-  EXPECT_THAT(DerFromRawEcdsa({1, 1, 1, 1}, 2), ::testing::SizeIs(10));
+TEST(EcdsaValueTest, MustBeExactlyTwiceAsLongAsTheOrder) {
+  EXPECT_THAT(DerFromRawEcdsa({1, 1, 1, 1}, 2), testing::SizeIs(10));
   EXPECT_THAT(DerFromRawEcdsa({1, 1, 1}, 2), IsEmpty());
   EXPECT_THAT(DerFromRawEcdsa({1, 1, 1, 1, 1}, 2), IsEmpty());
   EXPECT_THAT(DerFromRawEcdsa({}, 2), IsEmpty());
 }
 
-TEST(EcdsaValue, MayNotHoldAZero) {
+TEST(EcdsaValueTest, MustNotContainZero) {
   EXPECT_THAT(DerFromRawEcdsa({0, 0, 0, 1}, 2), IsEmpty());
   EXPECT_THAT(DerFromRawEcdsa({0, 1, 0, 0}, 2), IsEmpty());
 }
 
-TEST(EcdsaValue, IsReadAsTwoNumbersOfTheLengthOfTheOrder) {
+TEST(EcdsaValueTest, IsReadAsTwoNumbersOfTheLengthOfTheOrder) {
   EXPECT_THAT(RawEcdsaFromDer({0x30, 8, 0x02, 1, 1, 0x02, 3, 0, 0x80, 0}, 2),
               ElementsAre(0, 1, 0x80, 0));
   EXPECT_THAT(RawEcdsaFromDer({0x30, 6, 0x02, 1, 1, 0x02, 1, 2}, 3), ElementsAre(0, 0, 1, 0, 0, 2));
 }
 
-TEST(EcdsaValue, IsRefusedWhenANumberIsTooLongOrTheFormIsBroken) {
+TEST(EcdsaValueTest, IsRefusedWhenANumberIsTooLongOrTheEncodingIsBroken) {
   EXPECT_THROW(RawEcdsaFromDer({0x30, 8, 0x02, 1, 1, 0x02, 3, 0, 0x80, 0}, 1), CryptoException);
   EXPECT_THROW(RawEcdsaFromDer({0x30, 6, 0x02, 1, 1, 0x02, 1}, 2), CryptoException);
   EXPECT_THROW(RawEcdsaFromDer({0x30, 6, 0x02, 1, 1, 0x02, 1, 2, 0}, 2), CryptoException);
@@ -42,4 +42,4 @@ TEST(EcdsaValue, IsRefusedWhenANumberIsTooLongOrTheFormIsBroken) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Crypto
+}  // namespace Tarnik::Testing

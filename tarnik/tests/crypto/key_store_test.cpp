@@ -1,19 +1,21 @@
 #include <gtest/gtest.h>
 #include <openssl/err.h>
-
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/crypto/private_key.h>
+
 #include <stdexcept>
+#include <string>
 
 #include "support/key_texts.h"
+#include "support/openssl.h"
+#include "support/test_certificates.h"
 #include "support/test_pki.h"
+#include "support/thrown_message.h"
 
-namespace Tarnik::Crypto {
+namespace Tarnik::Testing {
 namespace {
 
-using Testing::TemporaryFile;
-using Tests::SharedRsaKey;
-using Tests::ToPkcs8Pem;
+using namespace Tarnik::Crypto;
 
 constexpr const char* kSecret = "correct horse";
 
@@ -22,24 +24,19 @@ std::string FileUri(const TemporaryFile& file) {
 }
 
 std::string LoadError(const std::string& uri, const PassphraseCallback& passphrase = {}) {
-  try {
-    LoadPrivateKeyFromUri(uri, passphrase);
-  } catch (const CryptoException& error) {
-    return error.Message();
-  }
-  return "loaded";
+  return ThrownMessage<CryptoException>([&] { LoadPrivateKeyFromUri(uri, passphrase); }, "loaded");
 }
 
 bool IsShared(const Ref<const PrivateKey>& key) {
-  return key->Matches(*Tests::MakeCertificate());
+  return key->Matches(*MakeCertificate());
 }
 
-TEST(KeyStore, LoadsAKeyFromAFileUri) {
+TEST(KeyStoreTest, LoadsAKeyFromAFileUri) {
   const TemporaryFile file(ToPkcs8Pem(SharedRsaKey()));
   EXPECT_TRUE(IsShared(LoadPrivateKeyFromUri(FileUri(file))));
 }
 
-TEST(KeyStore, AsksOnceForThePassphraseOfAFile) {
+TEST(KeyStoreTest, AsksOnceForThePassphraseOfAFile) {
   const std::string secret = kSecret;
   const TemporaryFile file(ToPkcs8Pem(SharedRsaKey(), &secret));
   int asked = 0;
@@ -50,7 +47,7 @@ TEST(KeyStore, AsksOnceForThePassphraseOfAFile) {
   EXPECT_EQ(asked, 1);
 }
 
-TEST(KeyStore, RefusesAnEncryptedFileWithoutThePassphrase) {
+TEST(KeyStoreTest, RefusesAnEncryptedFileWithoutThePassphrase) {
   const std::string secret = kSecret;
   const TemporaryFile file(ToPkcs8Pem(SharedRsaKey(), &secret));
   EXPECT_EQ(LoadError(FileUri(file)), "The private key needs a passphrase, and none was given.");
@@ -67,27 +64,27 @@ TEST(KeyStore, RefusesAnEncryptedFileWithoutThePassphrase) {
                std::out_of_range);
 }
 
-TEST(KeyStore, RefusesAFileWithoutAKeyOrWithTwo) {
+TEST(KeyStoreTest, RefusesAFileWithoutAKeyOrWithTwo) {
   const TemporaryFile text("nothing here");
   EXPECT_EQ(LoadError(FileUri(text)), "The URI 'file:' gives no private key.");
-  const TemporaryFile certificate(Testing::MakeCa("Root").Pem());
+  const TemporaryFile certificate(MakeCa("Root").Pem());
   EXPECT_EQ(LoadError(FileUri(certificate)), "The URI 'file:' gives no private key.");
-  const OpenSsl::OwnedKey other = Tests::MakeEcKey("P-256");
+  const OpenSsl::OwnedKey other = MakeEcKey("P-256");
   const TemporaryFile two(ToPkcs8Pem(SharedRsaKey()) + ToPkcs8Pem(other.get()));
   EXPECT_EQ(LoadError(FileUri(two)), "The URI 'file:' gives more than one private key.");
 }
 
-TEST(KeyStore, RefusesAFileThatIsNotThere) {
+TEST(KeyStoreTest, RefusesAMissingFile) {
   EXPECT_EQ(LoadError("file:/nonexistent/key.pem").find("The URI 'file:' gives no private key"),
             0U);
 }
 
-TEST(KeyStore, RefusesASchemeThatNothingUnderstandsWithoutNamingSecrets) {
+TEST(KeyStoreTest, RefusesAnUnknownSchemeWithoutRevealingSecrets) {
   const std::string message = LoadError("vault:object=key?pin-value=1234");
   EXPECT_EQ(message, "The URI 'vault:' gives no private key: unsupported.");
 }
 
-TEST(KeyStore, RefusesAUriWithoutAScheme) {
+TEST(KeyStoreTest, RefusesAUriWithoutAScheme) {
   const char* const refusal = "The URI of the private key has no scheme or holds a NUL.";
   EXPECT_EQ(LoadError(""), refusal);
   EXPECT_EQ(LoadError("/etc/key.pem"), refusal);
@@ -95,11 +92,11 @@ TEST(KeyStore, RefusesAUriWithoutAScheme) {
   EXPECT_EQ(LoadError(std::string("file:/a\0b", 9)), refusal);
 }
 
-TEST(KeyStore, LeavesTheCallersOpenSslErrorsAlone) {
+TEST(KeyStoreTest, LeavesTheCallersOpenSslErrorsUnchanged) {
   ERR_clear_error();
   EXPECT_NE(LoadError("vault:key"), "loaded");
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
 }  // namespace
-}  // namespace Tarnik::Crypto
+}  // namespace Tarnik::Testing

@@ -1,20 +1,22 @@
 #include <tarnik/crypto/private_key.h>
 
 #include <gtest/gtest.h>
-
+#include <tarnik/core/exception.h>
 #include <tarnik/crypto/crypto_exception.h>
-#include <cstring>
+
+#include <cstddef>
 #include <stdexcept>
+#include <string>
 #include <vector>
 
+#include "support/openssl.h"
 #include "support/test_pki.h"
+#include "support/thrown_message.h"
 
-namespace Tarnik::Crypto {
+namespace Tarnik::Testing {
 namespace {
 
-using Testing::Identity;
-using Testing::MakeCa;
-using Testing::MakeIdentity;
+using namespace Tarnik::Crypto;
 
 constexpr const char* kSecret = "correct horse";
 
@@ -64,14 +66,11 @@ KeyAndCertificate Load(const std::string& bytes, const PassphraseCallback& passp
 }
 
 std::string LoadError(const std::string& bytes, const char* passphrase = kSecret) {
-  try {
-    Load(
-        bytes, passphrase == nullptr ? PassphraseCallback()
-                                     : [passphrase] { return std::string(passphrase); });
-  } catch (const CryptoException& error) {
-    return error.Message();
+  PassphraseCallback callback;
+  if (passphrase != nullptr) {
+    callback = [passphrase] { return std::string(passphrase); };
   }
-  return "loaded";
+  return ThrownMessage<CryptoException>([&] { Load(bytes, callback); }, "loaded");
 }
 
 std::string Der(unsigned char tag, const std::string& content) {
@@ -84,8 +83,8 @@ std::string Der(unsigned char tag, const std::string& content) {
   return header + content;
 }
 
-/// A bag that holds `bags`, which it takes (RFC 7292, section 4.2.6). OpenSSL reads such bags, but
-/// makes none.
+/// A bag that contains `bags`, of which it takes ownership (RFC 7292, section 4.2.6). OpenSSL reads
+/// such bags, but cannot create them.
 PKCS12_SAFEBAG* BagOf(STACK_OF(PKCS12_SAFEBAG) * bags) {
   unsigned char* bytes = nullptr;
   const int length =
@@ -109,7 +108,7 @@ STACK_OF(PKCS12_SAFEBAG) * BagsWith(const Identity& identity) {
   return bags;
 }
 
-/// Takes `bags` and puts no passphrase on them, as some programs do.
+/// A PKCS#12 of `bags`, of which it takes ownership, without encryption.
 std::string Pack(STACK_OF(PKCS12_SAFEBAG) * bags) {
   STACK_OF(PKCS7)* safes = nullptr;
   PKCS12_add_safe(&safes, bags, -1, 0, nullptr);
@@ -120,7 +119,7 @@ std::string Pack(STACK_OF(PKCS12_SAFEBAG) * bags) {
   return Encode(pkcs12.get());
 }
 
-TEST(Pkcs12, GivesTheKeyItsCertificateAndTheChain) {
+TEST(Pkcs12Test, ReturnsTheKeyItsCertificateAndTheChain) {
   Recipe recipe;
   recipe.others = {&Pki::Get().intermediate, &Pki::Get().root};
   int asked = 0;
@@ -136,7 +135,7 @@ TEST(Pkcs12, GivesTheKeyItsCertificateAndTheChain) {
   EXPECT_EQ(loaded.chain[1], Pki::Get().root.ToCertificate());
 }
 
-TEST(Pkcs12, IsLoadedWithoutAQuestionWhenThePassphraseIsEmpty) {
+TEST(Pkcs12Test, IsLoadedWithoutAskingWhenThePassphraseIsEmpty) {
   for (const char* passphrase : {static_cast<const char*>(nullptr), ""}) {
     Recipe recipe;
     recipe.passphrase = passphrase;
@@ -147,7 +146,7 @@ TEST(Pkcs12, IsLoadedWithoutAQuestionWhenThePassphraseIsEmpty) {
   }
 }
 
-TEST(Pkcs12, RefusesAWrongPassphraseAndNone) {
+TEST(Pkcs12Test, RefusesAWrongOrMissingPassphrase) {
   const std::string bytes = Encode(Make({}).get());
   EXPECT_EQ(LoadError(bytes, nullptr), "The private key needs a passphrase, and none was given.");
   EXPECT_EQ(LoadError(bytes, "battery staple"),
@@ -156,16 +155,13 @@ TEST(Pkcs12, RefusesAWrongPassphraseAndNone) {
                std::out_of_range);
 }
 
-TEST(Pkcs12, RefusesAPassphraseWithANul) {
-  try {
-    Load(Encode(Make({}).get()), [] { return std::string(kSecret) + '\0'; });
-    FAIL() << "loaded";
-  } catch (const CryptoException& error) {
-    EXPECT_EQ(error.Message(), "The passphrase of a PKCS#12 cannot hold a NUL.");
-  }
+TEST(Pkcs12Test, RefusesAPassphraseWithANul) {
+  EXPECT_EQ(ThrownMessage<CryptoException>(
+                [] { Load(Encode(Make({}).get()), [] { return std::string(kSecret) + '\0'; }); }),
+            "The passphrase of a PKCS#12 cannot hold a NUL.");
 }
 
-TEST(Pkcs12, RefusesWhatIsNotThere) {
+TEST(Pkcs12Test, RefusesAMissingKeyOrCertificate) {
   Recipe keyless;
   keyless.key = nullptr;
   EXPECT_EQ(LoadError(Encode(Make(keyless).get())), "The PKCS#12 holds no private key.");
@@ -179,13 +175,13 @@ TEST(Pkcs12, RefusesWhatIsNotThere) {
             "No certificate of the PKCS#12 belongs to its private key.");
 }
 
-TEST(Pkcs12, RefusesASecondKey) {
+TEST(Pkcs12Test, RefusesASecondKey) {
   STACK_OF(PKCS12_SAFEBAG)* bags = BagsWith(Pki::Get().leaf);
   PKCS12_add_key(&bags, Pki::Get().stranger.key.get(), 0, 100, -1, kSecret);
   EXPECT_EQ(LoadError(Pack(bags)), "The PKCS#12 holds more than one private key.");
 }
 
-TEST(Pkcs12, RefusesASecondKeyInABagOfBags) {
+TEST(Pkcs12Test, RefusesASecondKeyInABagOfBags) {
   STACK_OF(PKCS12_SAFEBAG)* bags = BagsWith(Pki::Get().leaf);
   PKCS12_add_cert(&bags, Pki::Get().leaf.certificate.get());
   STACK_OF(PKCS12_SAFEBAG)* inner = sk_PKCS12_SAFEBAG_new_null();
@@ -194,8 +190,8 @@ TEST(Pkcs12, RefusesASecondKeyInABagOfBags) {
   EXPECT_EQ(LoadError(Pack(bags)), "The PKCS#12 holds more than one private key.");
 }
 
-// The twin of the above.
-TEST(Pkcs12, FindsItsOneKeyInABagOfBags) {
+// The counterpart of the test above.
+TEST(Pkcs12Test, FindsItsOnlyKeyInABagOfBags) {
   STACK_OF(PKCS12_SAFEBAG)* bags = nullptr;
   PKCS12_add_cert(&bags, Pki::Get().leaf.certificate.get());
   sk_PKCS12_SAFEBAG_push(bags, BagOf(BagsWith(Pki::Get().leaf)));
@@ -203,7 +199,7 @@ TEST(Pkcs12, FindsItsOneKeyInABagOfBags) {
   EXPECT_TRUE(loaded.privateKey->Matches(*loaded.certificate));
 }
 
-TEST(Pkcs12, RefusesOneThatNothingProtectsAgainstChanges) {
+TEST(Pkcs12Test, RefusesOneWithoutIntegrityProtection) {
   Recipe recipe;
   STACK_OF(X509)* none = nullptr;
   const OpenSsl::OwnedPkcs12 made(PKCS12_create(recipe.passphrase, nullptr, recipe.key,
@@ -212,7 +208,7 @@ TEST(Pkcs12, RefusesOneThatNothingProtectsAgainstChanges) {
             "The PKCS#12 is not protected against changes by a passphrase.");
 }
 
-TEST(Pkcs12, RefusesBytesThatAreNone) {
+TEST(Pkcs12Test, RefusesBytesThatAreNotPkcs12) {
   for (const std::string& bytes :
        {std::string(), std::string("text"), std::string("\x30\x00", 2)}) {
     EXPECT_EQ(LoadError(bytes).find("The PKCS#12 cannot be decoded"), 0U);
@@ -220,41 +216,32 @@ TEST(Pkcs12, RefusesBytesThatAreNone) {
   EXPECT_THROW(CreateKeyAndCertificateFromPkcs12(nullptr, 0), CryptoException);
 }
 
-TEST(Pkcs12, RefusesEveryPrefixOfItself) {
+TEST(Pkcs12Test, RefusesEveryPrefixOfItself) {
   const std::string bytes = Encode(Make({}).get());
   for (std::size_t length = 0; length < bytes.size(); length += 13) {
     EXPECT_NE(LoadError(bytes.substr(0, length)), "loaded") << length;
   }
 }
 
-TEST(Pkcs12, IsLoadedFromAFile) {
-  const Testing::TemporaryFile file(Encode(Make({}).get()));
+TEST(Pkcs12Test, IsLoadedFromAFile) {
+  const TemporaryFile file(Encode(Make({}).get()));
   const KeyAndCertificate loaded =
       LoadKeyAndCertificate(file.Path(), [] { return std::string(kSecret); });
   EXPECT_EQ(loaded.certificate, Pki::Get().leaf.ToCertificate());
 }
 
-TEST(Pkcs12, NamesTheFileThatCannotBeRead) {
-  try {
-    LoadKeyAndCertificate("/nonexistent/key.p12");
-    FAIL() << "loaded";
-  } catch (const IOException& error) {
-    EXPECT_EQ(error.Message(),
-              "The PKCS#12 file '/nonexistent/key.p12' cannot be read: No such file or directory.");
-  }
+TEST(Pkcs12Test, NamesTheFileThatCannotBeRead) {
+  EXPECT_EQ(ThrownMessage<IOException>([] { LoadKeyAndCertificate("/nonexistent/key.p12"); }),
+            "The PKCS#12 file '/nonexistent/key.p12' cannot be read: No such file or directory.");
 }
 
-TEST(Pkcs12, NamesTheFileThatCannotBeUsed) {
-  const Testing::TemporaryFile file("nothing here");
-  try {
-    LoadKeyAndCertificate(file.Path(), [] { return std::string(kSecret); });
-    FAIL() << "loaded";
-  } catch (const CryptoException& error) {
-    EXPECT_EQ(error.Message().rfind("The PKCS#12 file '" + file.Path() + "' cannot be used: ", 0),
-              0U)
-        << error.Message();
-  }
+TEST(Pkcs12Test, NamesTheFileThatCannotBeUsed) {
+  const TemporaryFile file("nothing here");
+  const std::string message = ThrownMessage<CryptoException>(
+      [&file] { LoadKeyAndCertificate(file.Path(), [] { return std::string(kSecret); }); });
+  EXPECT_EQ(message.rfind("The PKCS#12 file '" + file.Path() + "' cannot be used: ", 0), 0U)
+      << message;
 }
 
 }  // namespace
-}  // namespace Tarnik::Crypto
+}  // namespace Tarnik::Testing

@@ -1,5 +1,5 @@
 #!/bin/sh
-# Makes the files below signatures/ again, with new keys. Needs openssl and xmlsec1.
+# Creates the files in signatures/ again with new keys. Needs openssl and xmlsec1.
 set -eu
 
 here=$(cd "$(dirname "$0")" && pwd)
@@ -20,7 +20,7 @@ make_key() {
     openssl genpkey "$@" -out "$work/key.pem" 2>/dev/null
 }
 
-# certify NAME: a certificate of the key that was made last.
+# certify NAME: writes a certificate of the key that was created last.
 certify() {
   mv "$work/key.pem" "$work/$1.key"
   openssl req -x509 -new -key "$work/$1.key" -subj "/O=Test/CN=$1" -days 36500 -sha256 \
@@ -30,7 +30,7 @@ certify() {
 transform() { printf '<ds:Transform Algorithm="%s"/>' "$1"; }
 enveloped=$(transform ${ds}enveloped-signature)
 
-# The parts of the next template.
+# Sets the parts of the next template to their defaults.
 usual() {
   canonicalization=$exclusive
   method=${more}rsa-sha256
@@ -41,7 +41,7 @@ usual() {
   key_info='<ds:KeyInfo><ds:X509Data><ds:X509Certificate/></ds:X509Data></ds:KeyInfo>'
 }
 
-# assertion: the template of these parts.
+# assertion: prints the template with these parts.
 assertion() {
   printf '%s' "<saml:Assertion xmlns:saml=\"$saml\" ID=\"_a1\" Version=\"2.0\">" \
     '<saml:Issuer>sts</saml:Issuer>' \
@@ -54,7 +54,7 @@ assertion() {
     "$subject</saml:Assertion>"
 }
 
-# sign KEY FILE: what comes in, signed by xmlsec1 and checked by it.
+# sign KEY FILE: signs the standard input with xmlsec1 and lets it verify the result.
 sign() {
   cat > "$work/template.xml"
   xmlsec1 --sign --privkey-pem "$work/$1.key,$out/$1.pem" \
@@ -65,7 +65,7 @@ sign() {
     { cat "$work/log" >&2; exit 1; }
 }
 
-# alter FILE EXPRESSION: the plain good file, edited by sed.
+# alter FILE EXPRESSION: writes valid.xml, edited by sed.
 alter() {
   sed "$2" "$out/valid.xml" > "$out/$1"
   if cmp -s "$out/valid.xml" "$out/$1"; then
@@ -105,7 +105,7 @@ usual
 transforms=$enveloped
 assertion | sign signer valid-no-canonicalization.xml
 
-# What an XML reader makes of line ends and of white space in attributes is what is signed.
+# Line ends and white space in attributes are signed as an XML parser normalises them.
 usual
 subject=$(printf '<saml:Subject tab="a\tb" reference="a&#9;b&#10;c&#13;d">\r\nline&#13;\r\nend</saml:Subject>')
 assertion | sign signer valid-line-ends.xml
@@ -113,7 +113,7 @@ sed 's/$/\r/' "$out/valid-line-ends.xml" > "$work/line-ends.xml"
 mv "$work/line-ends.xml" "$out/valid-line-ends.xml"
 
 usual
-# No ampersand: libxml2 keeps a reference to one in a namespace URI as it was written.
+# No ampersand: libxml2 does not resolve a reference to one in a namespace URI.
 subject='<p:Subject xmlns:p="urn:'"'x'"'y" p:a="&lt;&quot;&gt;&amp;">]]&gt;"</p:Subject>'
 assertion | sign signer valid-namespace-with-apostrophes.xml
 

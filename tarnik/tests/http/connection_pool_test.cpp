@@ -1,13 +1,32 @@
 #include "http/idle_connections.h"
 
-#include "http/exchange_fixture.h"
+#include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/http_response.h>
+#include <tarnik/http/http_user_agent.h>
 
-namespace Tarnik::Http {
+#include <algorithm>
+#include <atomic>
+#include <chrono>
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "http/exchange_fixture.h"
+#include "support/scripted_spec.h"
+#include "support/scripted_stream.h"
+
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Http;
 
 class ConnectionPoolTest : public ExchangeFixture {
  protected:
-  /// Runs `count` exchanges at once, so that each has a connection of its own, and then ends them.
+  /// Runs `count` exchanges at once, each on its own connection, and then completes them.
   void ExchangeAtOnce(std::size_t count) {
     const std::size_t before = spec_->Streams().size();
     std::vector<Ref<PendingRequestItem>> items;
@@ -33,14 +52,14 @@ class ConnectionPoolTest : public ExchangeFixture {
 TEST_F(ConnectionPoolTest, ReusesAConnection) {
   UseAnswer(kHello);
   for (int i = 0; i < 20; ++i) {
-    EXPECT_EQ(Exchanged(), "hello");
+    EXPECT_EQ(ExchangeOnce(), "hello");
   }
   EXPECT_EQ(spec_->ConnectCount(), 1U);
 }
 
 TEST_F(ConnectionPoolTest, ReusesAConnectionFromWithinTheCompletion) {
   UseAnswer(kHello);
-  const auto inner = std::make_shared<Heard>();
+  const auto inner = std::make_shared<CompletionRecord>();
   const auto item = agent_->SendAsync(
       PostRequest().get(), [&](Exception*, ClientResponse*, PendingRequestItem*) { Send(inner); },
       0);
@@ -50,24 +69,24 @@ TEST_F(ConnectionPoolTest, ReusesAConnectionFromWithinTheCompletion) {
   EXPECT_EQ(spec_->ConnectCount(), 1U);
 }
 
-class SingleUseAnswerTest : public ConnectionPoolTest,
-                            public testing::WithParamInterface<const char*> {};
+class ConnectionPoolSingleUseAnswerTest : public ConnectionPoolTest,
+                                          public testing::WithParamInterface<const char*> {};
 
-TEST_P(SingleUseAnswerTest, IsTheLastOfItsConnection) {
+TEST_P(ConnectionPoolSingleUseAnswerTest, IsTheLastOfItsConnection) {
   ScriptedSpec::Script script;
   script.stream.onWritten = [](ScriptedStream& stream) {
     stream.Push(GetParam());
     stream.PushEnd();
   };
   Use(script);
-  EXPECT_EQ(Exchanged(), "hello");
-  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(ExchangeOnce(), "hello");
+  EXPECT_EQ(ExchangeOnce(), "hello");
   EXPECT_EQ(spec_->ConnectCount(), 2U);
   EXPECT_EQ(OpenCount(), 0U);
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    ConnectionPool, SingleUseAnswerTest,
+    Answers, ConnectionPoolSingleUseAnswerTest,
     testing::Values("HTTP/1.1 200 OK\r\nConnection: close\r\nContent-Length: 5\r\n\r\nhello",
                     "HTTP/1.0 200 OK\r\nContent-Length: 5\r\n\r\nhello",
                     "HTTP/1.1 200 OK\r\n\r\nhello",
@@ -75,29 +94,29 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_F(ConnectionPoolTest, DropsAnIdleConnectionThatThePeerCloses) {
   UseAnswer(kHello);
-  Exchanged();
+  ExchangeOnce();
   const auto stream = spec_->Streams().front();
   stream->PushEnd();
   EXPECT_TRUE(Eventually([&] { return stream->IsClosed(); }));
-  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(ExchangeOnce(), "hello");
   EXPECT_EQ(spec_->ConnectCount(), 2U);
 }
 
 TEST_F(ConnectionPoolTest, DropsAnIdleConnectionThatFails) {
   UseAnswer(kHello);
-  Exchanged();
+  ExchangeOnce();
   const auto stream = spec_->Streams().front();
   stream->PushError("Connection reset by peer");
   EXPECT_TRUE(Eventually([&] { return stream->IsClosed(); }));
 }
 
-TEST_F(ConnectionPoolTest, DropsAnIdleConnectionWithAnAnswerThatNobodyAskedFor) {
+TEST_F(ConnectionPoolTest, DropsAnIdleConnectionWithAnUnsolicitedAnswer) {
   UseAnswer(kHello);
-  Exchanged();
+  ExchangeOnce();
   const auto stream = spec_->Streams().front();
   stream->Push("HTTP/1.1 200 OK\r\nContent-Length: 4\r\n\r\nevil");
   EXPECT_TRUE(Eventually([&] { return stream->IsClosed(); }));
-  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(ExchangeOnce(), "hello");
 }
 
 TEST_F(ConnectionPoolTest, NeverSendsARequestTwice) {
@@ -111,39 +130,39 @@ TEST_F(ConnectionPoolTest, NeverSendsARequestTwice) {
     stream.PushEnd();
   };
   Use(script);
-  EXPECT_EQ(Exchanged(), "hello");
-  EXPECT_EQ(Exchanged(), "sts.example:443 closed the connection without an answer.");
+  EXPECT_EQ(ExchangeOnce(), "hello");
+  EXPECT_EQ(ExchangeOnce(), "sts.example:443 closed the connection without an answer.");
   EXPECT_EQ(spec_->ConnectCount(), 1U);
 }
 
 TEST_F(ConnectionPoolTest, ClosesIdleConnectionsWithTheAgent) {
   UseAnswer(kHello);
-  Exchanged();
+  ExchangeOnce();
   const auto stream = spec_->Streams().front();
   EXPECT_FALSE(stream->IsClosed());
   agent_ = nullptr;
   EXPECT_TRUE(stream->IsClosed());
 }
 
-TEST_F(ConnectionPoolTest, ClosesAConnectionThatIsFreeAfterTheAgentHasDied) {
+TEST_F(ConnectionPoolTest, ClosesAConnectionThatBecomesFreeAfterTheAgentIsGone) {
   Use({});
-  const auto heard = std::make_shared<Heard>();
-  const auto item = Send(heard);
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = Send(record);
   ASSERT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
   agent_ = nullptr;
   spec_->Streams().front()->Push(kHello);
-  EXPECT_TRUE(Eventually([&] { return heard->count == 1; }));
-  EXPECT_EQ(heard->body, "hello");
+  EXPECT_TRUE(Eventually([&] { return record->count == 1; }));
+  EXPECT_EQ(record->body, "hello");
   EXPECT_TRUE(spec_->Streams().front()->IsClosed());
 }
 
-TEST_F(ConnectionPoolTest, KeepsEightIdleConnectionsToAPlace) {
+TEST_F(ConnectionPoolTest, KeepsEightIdleConnectionsPerEndpoint) {
   Use({});
   ExchangeAtOnce(12);
   EXPECT_EQ(OpenCount(), kMaxIdlePerEndpoint);
 }
 
-TEST_F(ConnectionPoolTest, KeepsSixtyFourIdleConnectionsInAll) {
+TEST_F(ConnectionPoolTest, KeepsSixtyFourIdleConnectionsInTotal) {
   const auto pool = CreateConnectionPool();
   std::vector<Ref<ScriptedSpec>> specs;
   for (int i = 0; i < 9; ++i) {
@@ -164,27 +183,27 @@ TEST_F(ConnectionPoolTest, IsSharedByAgentsOfOneSpec) {
   ScriptedSpec::Script script;
   script.stream.onWritten = AnswerWith(kHello);
   Use(script, nullptr, pool.get());
-  Exchanged();
+  ExchangeOnce();
   agent_ = CreateHttpUserAgent(spec_.get(), nullptr, pool.get());
-  Exchanged();
+  ExchangeOnce();
   EXPECT_EQ(spec_->ConnectCount(), 1U);
 }
 
-TEST_F(ConnectionPoolTest, KeepsConnectionsOfOtherSpecsApart) {
+TEST_F(ConnectionPoolTest, SeparatesConnectionsOfDifferentSpecs) {
   const auto pool = CreateConnectionPool();
   ScriptedSpec::Script script;
   script.stream.onWritten = AnswerWith(kHello);
   Use(script, nullptr, pool.get());
-  Exchanged();
-  // The same endpoint, but perhaps another trust.
+  ExchangeOnce();
+  // The same endpoint, but the trust settings may differ.
   Use(script, nullptr, pool.get());
-  Exchanged();
+  ExchangeOnce();
   EXPECT_EQ(spec_->ConnectCount(), 1U);
 }
 
 TEST_F(ConnectionPoolTest, ClosesAConnectionThatIsIdleForTooLong) {
   UseAnswer(kHello);
-  Exchanged();
+  ExchangeOnce();
   const auto stream = spec_->Streams().front();
   EXPECT_FALSE(stream->IsClosed());
   EXPECT_TRUE(Eventually([&] {
@@ -203,8 +222,8 @@ TEST(ConnectionPoolConcurrencyTest, ServesManyThreads) {
   for (int t = 0; t < 8; ++t) {
     threads.emplace_back([&] {
       for (int i = 0; i < 50; ++i) {
-        const auto item =
-            agent->SendAsync(PostRequest().get(), Hear(std::make_shared<Heard>()), kPlentyOfTime);
+        const auto item = agent->SendAsync(
+            PostRequest().get(), RecordIn(std::make_shared<CompletionRecord>()), kPlentyOfTime);
         answered += agent->Wait(item.get(), kPlentyOfTime)->Status().code == 200 ? 1 : 0;
       }
     });
@@ -217,4 +236,4 @@ TEST(ConnectionPoolConcurrencyTest, ServesManyThreads) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

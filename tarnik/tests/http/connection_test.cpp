@@ -1,11 +1,24 @@
 #include "http/connection.h"
 
-#include "http/exchange_fixture.h"
+#include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/system/stream.h>
 
-namespace Tarnik::Http {
+#include <atomic>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "http/exchange_fixture.h"
+#include "support/scripted_stream.h"
+
+namespace Tarnik::Testing {
 namespace {
 
-/// What the handler of one read was told.
+using namespace Tarnik::Http;
+
+/// What the handler of one read has received.
 struct ReadResult {
   std::atomic<bool> isThere{false};
   std::string bytes;
@@ -45,7 +58,7 @@ class ConnectionTest : public testing::Test {
   std::shared_ptr<std::atomic<bool>> isLost_ = std::make_shared<std::atomic<bool>>(false);
 };
 
-TEST_F(ConnectionTest, ReadsWhatComes) {
+TEST_F(ConnectionTest, ReadsWhatArrives) {
   stream_->Push("one");
   EXPECT_EQ(ReadNow()->bytes, "one");
   stream_->Push("two");
@@ -64,7 +77,7 @@ TEST_F(ConnectionTest, HandsItsIdleReadToTheNextReader) {
   EXPECT_FALSE(*isLost_);
 }
 
-TEST_F(ConnectionTest, IsLostWhenAnythingComesWhileIdle) {
+TEST_F(ConnectionTest, IsLostWhenAnythingArrivesWhileIdle) {
   Watch();
   stream_->Push("x");
   EXPECT_TRUE(Eventually([&] { return isLost_->load(); }));
@@ -75,7 +88,7 @@ TEST_F(ConnectionTest, CannotBeClaimedUnlessItIsWatched) {
   EXPECT_FALSE(connection_->Claim());
 }
 
-TEST_F(ConnectionTest, KeepsWhatComesBetweenClaimAndRead) {
+TEST_F(ConnectionTest, KeepsWhatArrivesBetweenClaimAndRead) {
   Watch();
   ASSERT_TRUE(connection_->Claim());
   stream_->Push("early");
@@ -96,7 +109,7 @@ TEST_F(ConnectionTest, KeepsAFailureBetweenClaimAndRead) {
   EXPECT_EQ(result->error, "Connection reset by peer");
 }
 
-TEST_F(ConnectionTest, ClosesItsStreamWhenItDies) {
+TEST_F(ConnectionTest, ClosesItsStreamWhenDestroyed) {
   connection_ =
       MakeRef<Connection>(Ref<System::Stream>(MakeRef<ScriptedStream>(ScriptedStream::Script{})));
   EXPECT_TRUE(stream_->IsClosed());
@@ -107,4 +120,4 @@ TEST_F(ConnectionTest, IsNotSecureOverAPlainStream) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

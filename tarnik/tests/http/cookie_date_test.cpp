@@ -1,7 +1,11 @@
 #include "http/cookie_date.h"
 
-namespace Tarnik::Http {
+#include <gtest/gtest.h>
+
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Http;
 
 struct CookieDateCase {
   const char* text;
@@ -10,13 +14,13 @@ struct CookieDateCase {
 
 class CookieDateTest : public testing::TestWithParam<CookieDateCase> {};
 
-TEST_P(CookieDateTest, ReadsOrRefuses) {
+TEST_P(CookieDateTest, ParsesOrRefuses) {
   const auto date = ParseCookieDate(GetParam().text);
   EXPECT_EQ(date ? date->ToString() : "", GetParam().expected) << GetParam().text;
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    ParseCookieDate, CookieDateTest,
+    Texts, CookieDateTest,
     testing::Values(
         CookieDateCase{"Sun, 06 Nov 1994 08:49:37 GMT", "1994-11-06T08:49:37.000Z"},
         CookieDateCase{"Sunday, 06-Nov-94 08:49:37 GMT", "1994-11-06T08:49:37.000Z"},
@@ -37,4 +41,4 @@ INSTANTIATE_TEST_SUITE_P(
         CookieDateCase{"99999999999999999999", ""}));
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

@@ -1,10 +1,17 @@
 #include <tarnik/http/cookie_store.h>
 
-#include <thread>
+#include <gtest/gtest.h>
+#include <tarnik/system/date_time.h>
 
-namespace Tarnik::Http {
+#include <string>
+#include <string_view>
+#include <thread>
+#include <vector>
+
+namespace Tarnik::Testing {
 namespace {
 
+using namespace Tarnik::Http;
 using System::DateTime;
 
 const DateTime kNow = DateTime::Parse("2030-01-01T00:00:00Z");
@@ -54,7 +61,7 @@ TEST_F(CookieStoreTest, KeepsAnEmptyValue) {
   EXPECT_EQ(Header(), "id=");
 }
 
-TEST_F(CookieStoreTest, JoinsLongerPathsFirstThenTheOlder) {
+TEST_F(CookieStoreTest, ListsLongerPathsFirstAndThenOlderCookies) {
   Store("a=1; Path=/");
   Store("b=2; Path=/sts");
   Store("c=3; Path=/");
@@ -62,14 +69,14 @@ TEST_F(CookieStoreTest, JoinsLongerPathsFirstThenTheOlder) {
   EXPECT_EQ(Header(), "d=4; b=2; a=1; c=3");
 }
 
-TEST_F(CookieStoreTest, ReplacesACookieInItsPlace) {
+TEST_F(CookieStoreTest, ReplacesACookieInPlace) {
   Store("a=1; Path=/");
   Store("b=2; Path=/");
   Store("a=3; Path=/");
   EXPECT_EQ(Header(), "a=3; b=2");
 }
 
-TEST_F(CookieStoreTest, TellsNamesApartByCase) {
+TEST_F(CookieStoreTest, DistinguishesNamesByCase) {
   Store("a=1");
   Store("A=2");
   EXPECT_EQ(Header(), "a=1; A=2");
@@ -89,7 +96,7 @@ TEST_P(IgnoredCookieTest, IsNotStored) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    CookieStore, IgnoredCookieTest,
+    Cookies, IgnoredCookieTest,
     testing::Values(
         IgnoredCookie{""}, IgnoredCookie{"novalue"}, IgnoredCookie{"=value"},
         IgnoredCookie{" =value"}, IgnoredCookie{"; a=1"},
@@ -111,7 +118,7 @@ TEST_F(CookieStoreTest, AcceptsACookieOfTheLargestSize) {
   EXPECT_EQ(Header(), cookie);
 }
 
-TEST_F(CookieStoreTest, SendsAHostOnlyCookieToItsHostAlone) {
+TEST_F(CookieStoreTest, SendsAHostOnlyCookieOnlyToItsHost) {
   Store("a=1");
   EXPECT_EQ(Header("STS.Example"), "a=1");
   EXPECT_EQ(Header("a.sts.example"), "");
@@ -128,7 +135,7 @@ TEST_F(CookieStoreTest, SendsADomainCookieToEveryHostOfTheDomain) {
   EXPECT_EQ(Header("corp.example.evil"), "");
 }
 
-TEST_F(CookieStoreTest, TreatsAnAddressAsAHostAlone) {
+TEST_F(CookieStoreTest, DoesNotTreatAnAddressAsADomain) {
   Store("a=1; Domain=0.0.1", "10.0.0.1");
   EXPECT_EQ(Header("10.0.0.1"), "");
   Store("a=1; Domain=10.0.0.1", "10.0.0.1");
@@ -136,14 +143,14 @@ TEST_F(CookieStoreTest, TreatsAnAddressAsAHostAlone) {
   EXPECT_EQ(Header("1.10.0.0.1"), "");
 }
 
-TEST_F(CookieStoreTest, TakesAnEmptyDomainForNone) {
+TEST_F(CookieStoreTest, IgnoresAnEmptyDomain) {
   Store("a=1; Domain=.");
   Store("b=2; Domain=");
   EXPECT_EQ(Header(), "a=1; b=2");
   EXPECT_EQ(Header("a.sts.example"), "");
 }
 
-TEST_F(CookieStoreTest, AcceptsADomainOfOneLabelFromThatVeryHost) {
+TEST_F(CookieStoreTest, AcceptsADomainOfOneLabelFromThatHostItself) {
   Store("a=1; Domain=localhost", "localhost");
   EXPECT_EQ(Header("localhost"), "a=1");
   EXPECT_EQ(Header("a.localhost"), "");
@@ -157,13 +164,13 @@ struct PathCase {
 
 class CookiePathTest : public CookieStoreTest, public testing::WithParamInterface<PathCase> {};
 
-TEST_P(CookiePathTest, DecidesWhetherItIsSent) {
+TEST_P(CookiePathTest, DecidesWhetherTheCookieIsSent) {
   Store(GetParam().setCookie);
   EXPECT_EQ(Header("sts.example", GetParam().requestPath), GetParam().isSent ? "a=1" : "");
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    CookieStore, CookiePathTest,
+    Paths, CookiePathTest,
     testing::Values(
         PathCase{"a=1", "/sts/other", true}, PathCase{"a=1", "/sts", true},
         PathCase{"a=1", "/", false}, PathCase{"a=1", "/stsx", false},
@@ -174,7 +181,7 @@ INSTANTIATE_TEST_SUITE_P(
         PathCase{"a=1; Path=relative", "/x", false}, PathCase{"a=1; Path=", "/sts/x", true},
         PathCase{"a=1; Path=/x; Path=/", "/any", true}));
 
-TEST_F(CookieStoreTest, TakesTheDefaultPathWithoutTheQuery) {
+TEST_F(CookieStoreTest, DerivesTheDefaultPathWithoutTheQuery) {
   Store("a=1", "sts.example", "/sts?return=/deep/path");
   EXPECT_EQ(Header("sts.example", "/"), "a=1");
 }
@@ -191,18 +198,18 @@ TEST_F(CookieStoreTest, ExpiresByDate) {
   EXPECT_EQ(Header("sts.example", "/sts/service", true, kSecondLater), "");
 }
 
-TEST_F(CookieStoreTest, LetsMaxAgeWinOverExpires) {
+TEST_F(CookieStoreTest, PrefersMaxAgeToExpires) {
   Store("a=1; Max-Age=31536001; Expires=Tue, 01 Jan 2030 00:00:01 GMT");
   Store("b=2; Expires=Tue, 01 Jan 2030 00:00:01 GMT; Max-Age=31536001");
   EXPECT_EQ(Header("sts.example", "/sts/service", true, kYearLater), "a=1; b=2");
 }
 
-TEST_F(CookieStoreTest, TakesAnEndlessMaxAgeForTheEndOfTime) {
+TEST_F(CookieStoreTest, TreatsAHugeMaxAgeAsTheEndOfTime) {
   Store("a=1; Max-Age=99999999999999999999999");
   EXPECT_EQ(Header("sts.example", "/sts/service", true, kYearLater), "a=1");
 }
 
-TEST_F(CookieStoreTest, KeepsACookieWhoseExpiryMakesNoSense) {
+TEST_F(CookieStoreTest, KeepsACookieWithAMalformedExpiry) {
   Store("a=1; Max-Age=soon; Expires=someday");
   EXPECT_EQ(Header("sts.example", "/sts/service", true, kYearLater), "a=1");
 }
@@ -213,7 +220,7 @@ TEST_F(CookieStoreTest, DropsACookieThatIsSetAgainAsExpired) {
   EXPECT_EQ(Header(), "");
 }
 
-TEST_F(CookieStoreTest, KeepsSecureCookiesOffPlainHttp) {
+TEST_F(CookieStoreTest, DoesNotSendSecureCookiesOverPlainHttp) {
   Store("a=1; Secure");
   EXPECT_EQ(Header("sts.example", "/sts/service", false), "");
   EXPECT_EQ(Header(), "a=1");
@@ -224,7 +231,7 @@ TEST_F(CookieStoreTest, IgnoresSecureCookiesFromPlainHttp) {
   EXPECT_EQ(Header(), "");
 }
 
-TEST_F(CookieStoreTest, LetsPlainHttpNeitherReplaceNorDropASecureCookie) {
+TEST_F(CookieStoreTest, PlainHttpCanNeitherReplaceNorDropASecureCookie) {
   Store("a=1; Secure");
   Store("a=evil", "sts.example", "/sts/service", false);
   EXPECT_EQ(Header(), "a=1");
@@ -232,7 +239,7 @@ TEST_F(CookieStoreTest, LetsPlainHttpNeitherReplaceNorDropASecureCookie) {
   EXPECT_EQ(Header(), "a=1");
 }
 
-TEST_F(CookieStoreTest, HoldsFiftyCookiesOfAHostAndDropsTheOldest) {
+TEST_F(CookieStoreTest, KeepsFiftyCookiesPerHostAndDropsTheOldest) {
   Store("other=1; Path=/", "other.example");
   for (int i = 0; i < 50; ++i) {
     Store("n" + std::to_string(i) + "=1; Path=/");
@@ -244,7 +251,7 @@ TEST_F(CookieStoreTest, HoldsFiftyCookiesOfAHostAndDropsTheOldest) {
   EXPECT_EQ(Header("other.example"), "other=1");
 }
 
-TEST_F(CookieStoreTest, HoldsThreeHundredCookiesAndDropsTheOldest) {
+TEST_F(CookieStoreTest, KeepsThreeHundredCookiesAndDropsTheOldest) {
   for (int i = 0; i < 300; ++i) {
     Store("a=1", "h" + std::to_string(i) + ".example");
   }
@@ -282,4 +289,4 @@ TEST(CookieStoreConcurrencyTest, ServesManyThreads) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

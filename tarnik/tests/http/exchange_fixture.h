@@ -2,7 +2,11 @@
 #define TARNIK_TESTS_HTTP_EXCHANGE_FIXTURE_H
 
 #include <gtest/gtest.h>
-#include <tarnik/http/http_exception.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/cookie_store.h>
+#include <tarnik/http/http_request.h>
+#include <tarnik/http/http_response.h>
 #include <tarnik/http/http_user_agent.h>
 
 #include <atomic>
@@ -10,41 +14,31 @@
 #include <memory>
 #include <string>
 #include <thread>
+#include <utility>
 
+#include "http/response_body.h"
 #include "support/outcome.h"
 #include "support/scripted_spec.h"
+#include "support/scripted_stream.h"
 
-namespace Tarnik::Http {
-
-using Testing::AnswerWith;
-using Testing::ScriptedSpec;
-using Testing::ScriptedStream;
+namespace Tarnik::Testing {
 
 inline constexpr unsigned long kSecond = 1000000;
 inline constexpr unsigned long kPlentyOfTime = 60 * kSecond;
 inline constexpr const char* kHello = "HTTP/1.1 200 OK\r\nContent-Length: 5\r\n\r\nhello";
 
-inline std::string BodyOf(const ClientResponse& response) {
-  std::string body;
-  char buffer[1000];
-  while (const std::size_t count = response.Body()->Read(buffer, sizeof(buffer))) {
-    body.append(buffer, count);
-  }
-  return body;
-}
-
-inline Ref<ClientRequest> PostRequest(const std::string& body = "<a/>",
-                                      const std::string& target = "/sts") {
-  Ref<ClientRequest> request;
-  CreateHttpRequest(Method::POST, target, request);
+inline Ref<Http::ClientRequest> PostRequest(const std::string& body = "<a/>",
+                                            const std::string& target = "/sts") {
+  Ref<Http::ClientRequest> request;
+  Http::CreateHttpRequest(Http::Method::POST, target, request);
   request->BodyWriter()->Write(body);
   return request;
 }
 
-/// Waits until `condition` holds; false when it does not within the tests' patience.
+/// Waits until `condition` holds; returns false if it does not within the tests' patience.
 template <class Condition>
 bool Eventually(Condition condition) {
-  const auto end = std::chrono::steady_clock::now() + Testing::kPatience;
+  const auto end = std::chrono::steady_clock::now() + kPatience;
   while (!condition()) {
     if (std::chrono::steady_clock::now() > end) {
       return false;
@@ -54,27 +48,28 @@ bool Eventually(Condition condition) {
   return true;
 }
 
-/// What the completion of one exchange was told.
-struct Heard {
+/// What the completion of one exchange has received.
+struct CompletionRecord {
   std::atomic<int> count{0};
   std::atomic<int> responseCount{0};
   std::string message;
   std::string body;
-  PendingRequestItem* item = nullptr;
+  Http::PendingRequestItem* item = nullptr;
 };
 
-inline UserAgent::Completion Hear(const std::shared_ptr<Heard>& heard) {
-  return [heard](Exception* exception, ClientResponse* response, PendingRequestItem* item) {
-    heard->message = exception == nullptr ? std::string() : exception->Message();
-    heard->body = response == nullptr ? std::string() : BodyOf(*response);
-    heard->item = item;
-    heard->responseCount += response == nullptr ? 0 : 1;
+inline Http::UserAgent::Completion RecordIn(const std::shared_ptr<CompletionRecord>& record) {
+  return [record](Exception* exception, Http::ClientResponse* response,
+                  Http::PendingRequestItem* item) {
+    record->message = exception == nullptr ? std::string() : exception->Message();
+    record->body = response == nullptr ? std::string() : BodyOf(*response);
+    record->item = item;
+    record->responseCount += response == nullptr ? 0 : 1;
     EXPECT_NE(exception == nullptr, response == nullptr);
-    ++heard->count;
+    ++record->count;
   };
 }
 
-/// An agent over scripted streams. Checks in the end that no stream has been leaked.
+/// An agent over scripted streams. Checks at the end that no stream has leaked.
 class ExchangeFixture : public testing::Test {
  protected:
   void TearDown() override {
@@ -84,10 +79,10 @@ class ExchangeFixture : public testing::Test {
         << ScriptedStream::LiveCount() << " streams are left";
   }
 
-  void Use(ScriptedSpec::Script script, CookieStore* cookies = nullptr,
-           ConnectionPool* pool = nullptr) {
+  void Use(ScriptedSpec::Script script, Http::CookieStore* cookies = nullptr,
+           Http::ConnectionPool* pool = nullptr) {
     spec_ = MakeRef<ScriptedSpec>(std::move(script));
-    agent_ = CreateHttpUserAgent(spec_.get(), cookies, pool);
+    agent_ = Http::CreateHttpUserAgent(spec_.get(), cookies, pool);
   }
 
   /// The usual case: every stream answers `answer` to each request.
@@ -97,32 +92,33 @@ class ExchangeFixture : public testing::Test {
     Use(script);
   }
 
-  Ref<PendingRequestItem> Send(const std::shared_ptr<Heard>& heard = std::make_shared<Heard>(),
-                               unsigned long timeout = 0) {
-    return agent_->SendAsync(PostRequest().get(), Hear(heard), timeout);
+  Ref<Http::PendingRequestItem> Send(
+      const std::shared_ptr<CompletionRecord>& record = std::make_shared<CompletionRecord>(),
+      unsigned long timeout = 0) {
+    return agent_->SendAsync(PostRequest().get(), RecordIn(record), timeout);
   }
 
-  /// Sends a request and gives the body of its answer, or the message of its failure.
-  std::string Exchanged() {
-    const auto heard = std::make_shared<Heard>();
-    const auto item = Send(heard);
+  /// Sends a request and returns the body of its answer, or the message of its failure.
+  std::string ExchangeOnce() {
+    const auto record = std::make_shared<CompletionRecord>();
+    const auto item = Send(record);
     std::string result;
     try {
       agent_->Wait(item.get(), kPlentyOfTime);
-      result = heard->body;
+      result = record->body;
     } catch (const Exception& exception) {
       result = exception.Message();
-      EXPECT_EQ(heard->message, result);
+      EXPECT_EQ(record->message, result);
     }
-    EXPECT_EQ(heard->count, 1);
-    EXPECT_EQ(heard->item, item.get());
+    EXPECT_EQ(record->count, 1);
+    EXPECT_EQ(record->item, item.get());
     return result;
   }
 
   Ref<ScriptedSpec> spec_;
-  Ref<UserAgent> agent_;
+  Ref<Http::UserAgent> agent_;
 };
 
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing
 
 #endif

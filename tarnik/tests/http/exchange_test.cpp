@@ -1,25 +1,45 @@
 #include "http/exchange.h"
 
-#include "http/exchange_fixture.h"
+#include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/http_exception.h>
+#include <tarnik/http/http_response.h>
+#include <tarnik/http/http_user_agent.h>
 
-namespace Tarnik::Http {
+#include <atomic>
+#include <chrono>
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "http/exchange_fixture.h"
+#include "http/response_body.h"
+#include "support/scripted_spec.h"
+#include "support/scripted_stream.h"
+
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Http;
 
 class ExchangeTest : public ExchangeFixture {};
 
 constexpr const char* kChunkedHello =
     "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n5\r\nhello\r\n0\r\n\r\n";
 
-TEST_F(ExchangeTest, HandsTheAnswerToCompletionAndWaiter) {
+TEST_F(ExchangeTest, ReturnsTheAnswerToCompletionAndWaiter) {
   UseAnswer("HTTP/1.1 500 Internal Server Error\r\nX: y\r\nContent-Length: 5\r\n\r\nfault");
-  const auto heard = std::make_shared<Heard>();
-  const auto item = Send(heard);
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = Send(record);
   const auto response = agent_->Wait(item.get(), kPlentyOfTime);
   EXPECT_EQ(response->Status().code, 500);
   EXPECT_EQ(response->Status().reason, "Internal Server Error");
   EXPECT_EQ(response->Header("x"), "y");
-  EXPECT_EQ(heard->body, "fault");
-  EXPECT_EQ(heard->count, 1);
+  EXPECT_EQ(record->body, "fault");
+  EXPECT_EQ(record->count, 1);
   EXPECT_EQ(agent_->Wait(item.get(), 0), response);
 }
 
@@ -30,12 +50,12 @@ TEST_F(ExchangeTest, ReadsAnAnswerInPiecesOfAnySize) {
       script.stream.pieceSize = pieceSize;
       script.stream.onWritten = AnswerWith(answer);
       Use(script);
-      EXPECT_EQ(Exchanged(), "hello");
+      EXPECT_EQ(ExchangeOnce(), "hello");
     }
   }
 }
 
-TEST_F(ExchangeTest, FollowsNoRedirect) {
+TEST_F(ExchangeTest, DoesNotFollowRedirects) {
   for (int code = 300; code < 400; ++code) {
     UseAnswer("HTTP/1.1 " + std::to_string(code) +
               " Moved\r\nLocation: http://evil.example/\r\nConnection: close\r\nContent-Length: "
@@ -50,41 +70,41 @@ TEST_F(ExchangeTest, ReportsAFailedConnectAndDropsItsStream) {
   ScriptedSpec::Script script;
   script.connectError = "Cannot connect to sts.example:443: Connection refused";
   Use(script);
-  EXPECT_EQ(Exchanged(), "Cannot connect to sts.example:443: Connection refused");
+  EXPECT_EQ(ExchangeOnce(), "Cannot connect to sts.example:443: Connection refused");
 }
 
-TEST_F(ExchangeTest, ReportsAConnectThatGaveNoStream) {
+TEST_F(ExchangeTest, ReportsAConnectWithoutAStream) {
   ScriptedSpec::Script script;
-  script.givesNoStream = true;
+  script.omitsStream = true;
   Use(script);
-  EXPECT_EQ(Exchanged(), "The connection to sts.example:443 was opened without a stream.");
+  EXPECT_EQ(ExchangeOnce(), "The connection to sts.example:443 was opened without a stream.");
 }
 
 TEST_F(ExchangeTest, ThrowsWhatTheSpecThrowsAndNeverCompletes) {
   ScriptedSpec::Script script;
   script.startError = "bad host";
   Use(script);
-  const auto heard = std::make_shared<Heard>();
-  EXPECT_THROW(Send(heard, kSecond / 1000), InvalidArgumentException);
-  EXPECT_TRUE(Eventually([&] { return heard.use_count() == 1; }));
-  EXPECT_EQ(heard->count, 0);
+  const auto record = std::make_shared<CompletionRecord>();
+  EXPECT_THROW(Send(record, kSecond / 1000), InvalidArgumentException);
+  EXPECT_TRUE(Eventually([&] { return record.use_count() == 1; }));
+  EXPECT_EQ(record->count, 0);
 }
 
 TEST_F(ExchangeTest, ReportsAWriteThatFailsAtAnyByte) {
   UseAnswer(kHello);
-  Exchanged();
+  ExchangeOnce();
   const std::size_t size = spec_->Streams().front()->Written().size();
   for (std::size_t at = 0; at < size; ++at) {
     ScriptedSpec::Script script;
     script.stream.failWriteAt = at;
     script.stream.onWritten = AnswerWith(kHello);
     Use(script);
-    EXPECT_EQ(Exchanged(), "The write failed.") << at;
+    EXPECT_EQ(ExchangeOnce(), "The write failed.") << at;
     EXPECT_TRUE(spec_->Streams().front()->IsClosed());
   }
 }
 
-TEST_F(ExchangeTest, NeverTakesAnAnswerThatEndsAtAnyByteForAWholeOne) {
+TEST_F(ExchangeTest, RefusesAnAnswerThatEndsAtAnyByte) {
   for (const std::string answer : {kHello, kChunkedHello}) {
     for (std::size_t size = 0; size < answer.size(); ++size) {
       ScriptedSpec::Script script;
@@ -93,7 +113,7 @@ TEST_F(ExchangeTest, NeverTakesAnAnswerThatEndsAtAnyByteForAWholeOne) {
         stream.PushEnd();
       };
       Use(script);
-      const std::string result = Exchanged();
+      const std::string result = ExchangeOnce();
       const std::size_t headSize = answer.find("\r\n\r\n") + 4;
       const std::string expected =
           size == 0         ? "sts.example:443 closed the connection without an answer."
@@ -105,7 +125,7 @@ TEST_F(ExchangeTest, NeverTakesAnAnswerThatEndsAtAnyByteForAWholeOne) {
   }
 }
 
-TEST_F(ExchangeTest, NeverTakesAnAnswerThatFailsAtAnyByteForAWholeOne) {
+TEST_F(ExchangeTest, RefusesAnAnswerThatFailsAtAnyByte) {
   const std::string untilEnd = "HTTP/1.1 200 OK\r\n\r\nhello";
   for (const std::string& answer : {std::string(kHello), std::string(kChunkedHello), untilEnd}) {
     const std::size_t end = answer == untilEnd ? answer.size() + 1 : answer.size();
@@ -116,26 +136,26 @@ TEST_F(ExchangeTest, NeverTakesAnAnswerThatFailsAtAnyByteForAWholeOne) {
         stream.PushError("Connection reset by peer");
       };
       Use(script);
-      EXPECT_EQ(Exchanged(), "Connection reset by peer") << size;
+      EXPECT_EQ(ExchangeOnce(), "Connection reset by peer") << size;
       EXPECT_TRUE(spec_->Streams().front()->IsClosed());
     }
   }
 }
 
-TEST_F(ExchangeTest, TakesTheEndForTheEndOfABodyWithoutLength) {
+TEST_F(ExchangeTest, EndsABodyWithoutLengthAtTheEndOfTheConnection) {
   ScriptedSpec::Script script;
   script.stream.onWritten = [](ScriptedStream& stream) {
     stream.Push("HTTP/1.0 200 OK\r\n\r\nhello");
     stream.PushEnd();
   };
   Use(script);
-  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(ExchangeOnce(), "hello");
   EXPECT_TRUE(spec_->Streams().front()->IsClosed());
 }
 
-TEST_F(ExchangeTest, RefusesAMalformedAnswerAndCloses) {
+TEST_F(ExchangeTest, RefusesAMalformedAnswerAndClosesTheConnection) {
   UseAnswer("HTTP/1.1 200 OK\r\nContent-Length: +5\r\n\r\nhello");
-  EXPECT_EQ(Exchanged(), "The answer from sts.example:443 has a malformed Content-Length.");
+  EXPECT_EQ(ExchangeOnce(), "The answer from sts.example:443 has a malformed Content-Length.");
   EXPECT_TRUE(spec_->Streams().front()->IsClosed());
 }
 
@@ -145,7 +165,7 @@ TEST_F(ExchangeTest, KeepsTheClassOfAFailure) {
   EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), HttpException);
 }
 
-TEST_F(ExchangeTest, TakesAnEarlyAnswerThatClosesBeforeTheRequestIsWritten) {
+TEST_F(ExchangeTest, AcceptsAnEarlyAnswerThatClosesBeforeTheRequestIsWritten) {
   ScriptedSpec::Script script;
   script.stream.holdWrites = true;
   Use(script);
@@ -157,19 +177,19 @@ TEST_F(ExchangeTest, TakesAnEarlyAnswerThatClosesBeforeTheRequestIsWritten) {
   EXPECT_TRUE(spec_->Streams().front()->IsClosed());
 }
 
-TEST_F(ExchangeTest, WaitsForItsWriteBeforeAKeptConnectionIsGivenOn) {
+TEST_F(ExchangeTest, WaitsForItsWriteBeforeTheConnectionIsReused) {
   ScriptedSpec::Script script;
   script.stream.holdWrites = true;
   Use(script);
-  const auto heard = std::make_shared<Heard>();
-  const auto item = Send(heard);
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = Send(record);
   ASSERT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
   const auto stream = spec_->Streams().front();
   ASSERT_TRUE(Eventually([&] { return !stream->Written().empty(); }));
   stream->Push(kHello);
   stream->ReleaseWrite();
   EXPECT_EQ(BodyOf(*agent_->Wait(item.get(), kPlentyOfTime)), "");
-  EXPECT_EQ(heard->body, "hello");
+  EXPECT_EQ(record->body, "hello");
   EXPECT_FALSE(stream->IsClosed());
 }
 
@@ -188,7 +208,7 @@ class StalledExchangeTest : public ExchangeFixture, public testing::WithParamInt
     Use(script);
   }
 
-  /// Waits until the exchange has come as far as it will.
+  /// Waits until the exchange is stalled.
   bool IsStalled() {
     if (GetParam() == Stage::kConnect) {
       return spec_->ConnectCount() == 1;
@@ -206,59 +226,59 @@ class StalledExchangeTest : public ExchangeFixture, public testing::WithParamInt
   }
 };
 
-TEST_P(StalledExchangeTest, EndsOnceByCancel) {
-  const auto heard = std::make_shared<Heard>();
-  const auto item = Send(heard);
+TEST_P(StalledExchangeTest, EndsOnceWhenCancelled) {
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = Send(record);
   ASSERT_TRUE(IsStalled());
   EXPECT_TRUE(item->Cancel());
   EXPECT_FALSE(item->Cancel());
   EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), CancelledException);
-  EXPECT_EQ(heard->message, "The request to sts.example:443 was cancelled.");
+  EXPECT_EQ(record->message, "The request to sts.example:443 was cancelled.");
   ExpectReleased();
-  EXPECT_TRUE(Eventually([&] { return heard.use_count() == 1; }));
-  EXPECT_EQ(heard->count, 1);
+  EXPECT_TRUE(Eventually([&] { return record.use_count() == 1; }));
+  EXPECT_EQ(record->count, 1);
 }
 
-TEST_P(StalledExchangeTest, EndsOnceByItsOwnTimeLimit) {
-  const auto heard = std::make_shared<Heard>();
-  const auto item = Send(heard, 20000);
+TEST_P(StalledExchangeTest, EndsOnceAtItsOwnTimeLimit) {
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = Send(record, 20000);
   EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), TimeoutException);
-  EXPECT_EQ(heard->message, "No answer from sts.example:443 within 20 milliseconds.");
-  EXPECT_TRUE(Eventually([&] { return heard.use_count() == 1; }));
-  EXPECT_EQ(heard->count, 1);
+  EXPECT_EQ(record->message, "No answer from sts.example:443 within 20 milliseconds.");
+  EXPECT_TRUE(Eventually([&] { return record.use_count() == 1; }));
+  EXPECT_EQ(record->count, 1);
 }
 
-TEST_P(StalledExchangeTest, EndsOnceByTheWaitersTimeLimit) {
-  const auto heard = std::make_shared<Heard>();
-  const auto item = Send(heard);
+TEST_P(StalledExchangeTest, EndsOnceAtTheWaitersTimeLimit) {
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = Send(record);
   ASSERT_TRUE(IsStalled());
   EXPECT_THROW(agent_->Wait(item.get(), 1500), TimeoutException);
-  EXPECT_EQ(heard->count, 1);
-  EXPECT_EQ(heard->message, "No answer from sts.example:443 within 1500 microseconds.");
+  EXPECT_EQ(record->count, 1);
+  EXPECT_EQ(record->message, "No answer from sts.example:443 within 1500 microseconds.");
   ExpectReleased();
   EXPECT_FALSE(item->Cancel());
 }
 
 TEST_P(StalledExchangeTest, OutlivesItsAgentAndItsHandle) {
-  const auto heard = std::make_shared<Heard>();
-  auto item = Send(heard, 20000);
+  const auto record = std::make_shared<CompletionRecord>();
+  auto item = Send(record, 20000);
   agent_ = nullptr;
   item = nullptr;
-  EXPECT_TRUE(Eventually([&] { return heard->count == 1; }));
-  EXPECT_TRUE(Eventually([&] { return heard.use_count() == 1; }));
+  EXPECT_TRUE(Eventually([&] { return record->count == 1; }));
+  EXPECT_TRUE(Eventually([&] { return record.use_count() == 1; }));
 }
 
-INSTANTIATE_TEST_SUITE_P(Exchange, StalledExchangeTest,
+INSTANTIATE_TEST_SUITE_P(Stages, StalledExchangeTest,
                          testing::Values(Stage::kConnect, Stage::kWrite, Stage::kHead,
                                          Stage::kBody));
 
-TEST_F(ExchangeTest, HoldsItsTimeLimitAgainstAByteNowAndThen) {
+TEST_F(ExchangeTest, EnforcesItsTimeLimitWhileBytesTrickleIn) {
   Use({});
-  const auto item = Send(std::make_shared<Heard>(), 50000);
+  const auto item = Send(std::make_shared<CompletionRecord>(), 50000);
   ASSERT_TRUE(Eventually([&] { return !spec_->Streams().empty(); }));
   const auto stream = spec_->Streams().front();
   std::atomic<bool> isOver{false};
-  std::thread dribble([&] {
+  std::thread trickle([&] {
     stream->Push("HTTP/1.1 200 OK\r\n");
     while (!isOver) {
       stream->Push("x");
@@ -267,21 +287,21 @@ TEST_F(ExchangeTest, HoldsItsTimeLimitAgainstAByteNowAndThen) {
   });
   EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), TimeoutException);
   isOver = true;
-  dribble.join();
+  trickle.join();
 }
 
-// The exchange may be over before the start of its connect returns, and the connection may serve
-// the next one.
-TEST_F(ExchangeTest, CancelsNoConnectThatHasEnded) {
-  const auto heard = std::make_shared<Heard>();
+// The exchange may end before the start of its connect returns, and the connection may already
+// serve the next exchange.
+TEST_F(ExchangeTest, DoesNotCancelAConnectThatHasEnded) {
+  const auto record = std::make_shared<CompletionRecord>();
   ScriptedSpec::Script script;
   script.stream.onWritten = AnswerWith(kHello);
-  script.beforeStartReturns = [heard] {
-    EXPECT_TRUE(Eventually([&] { return heard->count == 1; }));
+  script.beforeStartReturns = [record] {
+    EXPECT_TRUE(Eventually([&] { return record->count == 1; }));
   };
   Use(script);
-  Send(heard);
-  EXPECT_EQ(heard->body, "hello");
+  Send(record);
+  EXPECT_EQ(record->body, "hello");
   EXPECT_EQ(spec_->CancelCount(), 0U);
 }
 
@@ -290,7 +310,7 @@ TEST_F(ExchangeTest, ClosesAStreamThatIsConnectedAfterTheEnd) {
   script.holdConnects = true;
   Use(script);
   const auto first = Send();
-  // A spec whose item cannot stop its connect any more.
+  // The connect can no longer be stopped.
   spec_->ReleaseConnect();
   first->Cancel();
   EXPECT_THROW(agent_->Wait(first.get(), kPlentyOfTime), CancelledException);
@@ -311,35 +331,35 @@ TEST_P(TimeoutMessageTest, NamesTheLimit) {
   ScriptedSpec::Script script;
   script.holdConnects = true;
   Use(script);
-  const auto heard = std::make_shared<Heard>();
-  const auto item = Send(heard, GetParam().microseconds);
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = Send(record, GetParam().microseconds);
   EXPECT_THROW(agent_->Wait(item.get(), 0), TimeoutException);
-  EXPECT_EQ(heard->message,
+  EXPECT_EQ(record->message,
             std::string("No answer from sts.example:443 within ") + GetParam().text + ".");
 }
 
-INSTANTIATE_TEST_SUITE_P(Exchange, TimeoutMessageTest,
+INSTANTIATE_TEST_SUITE_P(Durations, TimeoutMessageTest,
                          testing::Values(DurationCase{1, "1 microseconds"},
                                          DurationCase{1000, "1 milliseconds"},
                                          DurationCase{1001, "1001 microseconds"},
                                          DurationCase{1000000, "1 second"}));
 
-TEST_F(ExchangeTest, WaitsForEverWithALimitBeyondTheClock) {
+TEST_F(ExchangeTest, WaitsForeverWithALimitBeyondTheClock) {
   UseAnswer(kHello);
   const auto item = Send();
   EXPECT_EQ(agent_->Wait(item.get(), ~0UL)->Status().code, 200);
 }
 
-// The completion, the time limit and a cancel meet in every order; one of them wins.
-TEST(ExchangeConcurrencyTest, EndsOnceHoweverEndsRace) {
+// The completion, the time limit and a cancel may come in any order; exactly one of them wins.
+TEST(ExchangeConcurrencyTest, EndsExactlyOnceInEveryRace) {
   ScriptedSpec::Script script;
   script.stream.pieceSize = 7;
   script.stream.onWritten = AnswerWith(kHello);
   const auto spec = MakeRef<ScriptedSpec>(script);
   const auto agent = CreateHttpUserAgent(spec.get(), nullptr, nullptr);
   for (int i = 0; i < 300; ++i) {
-    const auto heard = std::make_shared<Heard>();
-    const auto item = agent->SendAsync(PostRequest().get(), Hear(heard), 1 + i % 40);
+    const auto record = std::make_shared<CompletionRecord>();
+    const auto item = agent->SendAsync(PostRequest().get(), RecordIn(record), 1 + i % 40);
     std::thread canceller([&] { item->Cancel(); });
     bool hasFailed = false;
     try {
@@ -348,18 +368,18 @@ TEST(ExchangeConcurrencyTest, EndsOnceHoweverEndsRace) {
       hasFailed = true;
     }
     canceller.join();
-    EXPECT_EQ(heard->count, 1);
-    EXPECT_EQ(heard->responseCount, hasFailed ? 0 : 1);
+    EXPECT_EQ(record->count, 1);
+    EXPECT_EQ(record->responseCount, hasFailed ? 0 : 1);
     spec->ForgetStreams();
   }
 }
 
-TEST(ExchangeConcurrencyTest, CarriesAThousandExchangesAtOnce) {
+TEST(ExchangeConcurrencyTest, RunsAThousandExchangesAtOnce) {
   constexpr int kCount = 1000;
   ScriptedSpec::Script script;
   const auto spec = MakeRef<ScriptedSpec>(script);
   const auto agent = CreateHttpUserAgent(spec.get(), nullptr, nullptr);
-  const auto heard = std::make_shared<Heard>();
+  const auto record = std::make_shared<CompletionRecord>();
   std::atomic<int> answered{0};
   std::vector<Ref<PendingRequestItem>> items;
   for (int i = 0; i < kCount; ++i) {
@@ -370,7 +390,7 @@ TEST(ExchangeConcurrencyTest, CarriesAThousandExchangesAtOnce) {
         },
         kPlentyOfTime));
   }
-  // All are under way before the first is answered.
+  // All are pending before the first is answered.
   ASSERT_TRUE(Eventually([&] { return spec->Streams().size() == kCount; }));
   EXPECT_EQ(answered, 0);
   for (const auto& stream : spec->Streams()) {
@@ -383,4 +403,4 @@ TEST(ExchangeConcurrencyTest, CarriesAThousandExchangesAtOnce) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

@@ -1,11 +1,19 @@
 #include <tarnik/http/http_request.h>
 
+#include <gtest/gtest.h>
 #include <tarnik/core/checked_cast.h>
+#include <tarnik/core/exception.h>
+
+#include <string>
 
 #include "http/http_request_impl.h"
+#include "support/sensitive_text.h"
+#include "support/thrown_message.h"
 
-namespace Tarnik::Http {
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Http;
 
 std::string Sent(const Ref<ClientRequest>& request, const RequestRoute& route) {
   SensitiveText wire;
@@ -19,7 +27,7 @@ Ref<ClientRequest> Post(const std::string& target = "/sts/service?x=1") {
   return request;
 }
 
-TEST(ClientRequest, WritesItsHeadersInTheirOrderAndThenItsBody) {
+TEST(ClientRequestTest, WritesItsHeadersInOrderAndThenItsBody) {
   const auto request = Post();
   request->SetHeader("Content-Type", "text/xml");
   request->SetHeader("SOAPAction", "\"urn:issue\"");
@@ -36,24 +44,24 @@ TEST(ClientRequest, WritesItsHeadersInTheirOrderAndThenItsBody) {
             "<a/>\n");
 }
 
-TEST(ClientRequest, SaysTheLengthOfAnEmptyPostAndLeavesCookiesOutWhenThereAreNone) {
+TEST(ClientRequestTest, SendsTheLengthOfAnEmptyPostAndNoEmptyCookieHeader) {
   EXPECT_EQ(Sent(Post("/"), {"h", "", ""}),
             "POST / HTTP/1.1\r\nHost: h\r\nContent-Length: 0\r\n\r\n");
 }
 
-TEST(ClientRequest, SaysNoLengthForAGetWithoutBody) {
+TEST(ClientRequestTest, SendsNoLengthForAGetWithoutABody) {
   Ref<ClientRequest> request;
   CreateHttpRequest(Method::GET, "/", request);
   EXPECT_EQ(Sent(request, {"h", "", ""}), "GET / HTTP/1.1\r\nHost: h\r\n\r\n");
 }
 
-TEST(ClientRequest, PutsThePrefixBeforeAPathButNotBeforeAWholeUrl) {
+TEST(ClientRequestTest, PutsThePrefixBeforeAPathButNotBeforeAWholeUrl) {
   EXPECT_TRUE(Sent(Post("/a"), {"h", "http://h", ""}).starts_with("POST http://h/a HTTP/1.1\r\n"));
   EXPECT_TRUE(Sent(Post("https://x/a"), {"h", "http://h", ""})
                   .starts_with("POST https://x/a HTTP/1.1\r\n"));
 }
 
-TEST(ClientRequest, ReplacesAHeaderInItsPlaceWithoutRegardToCase) {
+TEST(ClientRequestTest, ReplacesAHeaderInPlaceIgnoringCase) {
   const auto request = Post("/");
   request->SetHeader("A", "1");
   request->SetHeader("B", "2");
@@ -61,14 +69,14 @@ TEST(ClientRequest, ReplacesAHeaderInItsPlaceWithoutRegardToCase) {
   EXPECT_TRUE(Sent(request, {"h", "", ""}).ends_with("\r\na: 3\r\nB: 2\r\n\r\n"));
 }
 
-TEST(ClientRequest, ForgetsItsBodyOnceMoved) {
+TEST(ClientRequestTest, ForgetsItsBodyOnceMoved) {
   const auto request = Post("/");
   request->BodyWriter()->Write("secret");
   Sent(request, {"h", "", ""});
   EXPECT_TRUE(Sent(request, {"h", "", ""}).ends_with("Content-Length: 0\r\n\r\n"));
 }
 
-TEST(ClientRequest, KeepsAnyByteOfItsBody) {
+TEST(ClientRequestTest, PreservesEveryByteOfItsBody) {
   const auto request = Post("/");
   std::string body;
   for (int i = 0; i < 70000; ++i) {
@@ -78,7 +86,7 @@ TEST(ClientRequest, KeepsAnyByteOfItsBody) {
   EXPECT_TRUE(Sent(request, {"h", "", ""}).ends_with("\r\n\r\n" + body));
 }
 
-TEST(ClientRequest, KeepsAWriterAliveBeyondTheRequest) {
+TEST(ClientRequestTest, WriterOutlivesTheRequest) {
   auto writer = Post("/")->BodyWriter();
   writer->Write("late");
   EXPECT_EQ(writer->RefCount(), 1);
@@ -92,7 +100,7 @@ TEST_P(BadTargetTest, IsRefused) {
   EXPECT_EQ(request, nullptr);
 }
 
-INSTANTIATE_TEST_SUITE_P(CreateHttpRequest, BadTargetTest,
+INSTANTIATE_TEST_SUITE_P(Targets, BadTargetTest,
                          testing::Values("", " ", "/a b", "/a\r\nX: y", "/a\n", "/\t",
                                          std::string("/\0", 2), "/\x7F", "/\xC3\xA9",
                                          "/ HTTP/1.1\r\nHost: evil\r\n\r\n"));
@@ -107,12 +115,9 @@ class BadHeaderTest : public testing::TestWithParam<BadHeader> {};
 
 TEST_P(BadHeaderTest, IsRefusedWithItsReason) {
   const auto request = Post("/");
-  try {
-    request->SetHeader(GetParam().name, GetParam().value);
-    FAIL();
-  } catch (const InvalidArgumentException& exception) {
-    EXPECT_EQ(exception.Message(), GetParam().message);
-  }
+  EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
+                [&request] { request->SetHeader(GetParam().name, GetParam().value); }),
+            GetParam().message);
   EXPECT_EQ(Sent(request, {"h", "", ""}),
             "POST / HTTP/1.1\r\nHost: h\r\nContent-Length: 0\r\n\r\n");
 }
@@ -121,7 +126,7 @@ constexpr const char* kNotToken = "The name of an HTTP header is not a token.";
 constexpr const char* kBadValue = "The value of the HTTP header X holds a control character.";
 
 INSTANTIATE_TEST_SUITE_P(
-    SetHeader, BadHeaderTest,
+    Headers, BadHeaderTest,
     testing::Values(
         BadHeader{"", "1", kNotToken}, BadHeader{"X Y", "1", kNotToken},
         BadHeader{"X:", "1", kNotToken}, BadHeader{"X\r\n", "1", kNotToken},
@@ -139,4 +144,4 @@ INSTANTIATE_TEST_SUITE_P(
         BadHeader{"Cookie", "a=1", "The HTTP header Cookie is set only by the user agent."}));
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

@@ -1,9 +1,16 @@
 #include <tarnik/http/http_url.h>
 
+#include <gtest/gtest.h>
 #include <tarnik/core/exception.h>
 
-namespace Tarnik::Http {
+#include <string>
+
+#include "support/thrown_message.h"
+
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Http;
 
 struct GoodUrl {
   const char* url;
@@ -28,7 +35,7 @@ TEST_P(GoodUrlTest, IsSplit) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    ParseHttpURL, GoodUrlTest,
+    Urls, GoodUrlTest,
     testing::Values(
         GoodUrl{"https://sts.example/sts/service", true, "sts.example", 443, "/sts/service"},
         GoodUrl{"http://sts.example/sts", false, "sts.example", 80, "/sts"},
@@ -62,12 +69,10 @@ TEST_P(BadUrlTest, IsRefusedWithItsFaultAndChangesNothing) {
   std::string host = "before";
   int port = 7;
   std::string path = "/before";
-  try {
-    ParseHttpURL(GetParam().url, isHttps, host, port, path);
-    FAIL() << "accepted: " << GetParam().url;
-  } catch (const InvalidArgumentException& exception) {
-    EXPECT_EQ(exception.Message(), std::string("Malformed URL: ") + GetParam().fault + ".");
-  }
+  EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
+                [&] { ParseHttpURL(GetParam().url, isHttps, host, port, path); }),
+            std::string("Malformed URL: ") + GetParam().fault + ".")
+      << GetParam().url;
   EXPECT_TRUE(isHttps);
   EXPECT_EQ(host, "before");
   EXPECT_EQ(port, 7);
@@ -83,7 +88,7 @@ constexpr const char* kEncode = "the path or query holds a character that must b
 constexpr const char* kEscape = "a percent sign is not followed by two hexadecimal digits";
 
 INSTANTIATE_TEST_SUITE_P(
-    ParseHttpURL, BadUrlTest,
+    Urls, BadUrlTest,
     testing::Values(
         BadUrl{"", kScheme}, BadUrl{"sts.example/sts", kScheme}, BadUrl{"/sts", kScheme},
         BadUrl{"ftp://sts.example/", kScheme}, BadUrl{"https:/sts.example/", kScheme},
@@ -130,7 +135,7 @@ INSTANTIATE_TEST_SUITE_P(
         BadUrl{"https://sts.example/a\\b", kEncode}, BadUrl{"https://sts.example/?a[0]", kEncode},
         BadUrl{"https://sts.example/<>", kEncode}));
 
-TEST(ParseHttpURL, MessageNeverRepeatsThePassword) {
+TEST(ParseHttpURLTest, MessageNeverRepeatsThePassword) {
   bool isHttps = false;
   std::string host;
   int port = 0;
@@ -143,7 +148,7 @@ TEST(ParseHttpURL, MessageNeverRepeatsThePassword) {
   }
 }
 
-TEST(ParseHttpURL, AcceptsTheLongestNameAndRefusesALongerOne) {
+TEST(ParseHttpURLTest, AcceptsTheLongestNameAndRefusesALongerOne) {
   const std::string label(62, 'a');
   const std::string longest = label + "." + label + "." + label + "." + label + ".a";
   ASSERT_EQ(longest.size(), 253U);
@@ -158,4 +163,4 @@ TEST(ParseHttpURL, AcceptsTheLongestNameAndRefusesALongerOne) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

@@ -1,9 +1,21 @@
 #include <tarnik/http/http_user_agent.h>
 
-#include "http/exchange_fixture.h"
+#include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/http/cookie_store.h>
+#include <tarnik/http/http_response.h>
+#include <tarnik/system/date_time.h>
 
-namespace Tarnik::Http {
+#include <memory>
+#include <string>
+
+#include "http/exchange_fixture.h"
+#include "support/scripted_spec.h"
+
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Http;
 
 class UserAgentTest : public ExchangeFixture {};
 
@@ -11,9 +23,9 @@ std::string HeadWith(const std::string& fields) {
   return "HTTP/1.1 200 OK\r\n" + fields + "Content-Length: 0\r\n\r\n";
 }
 
-TEST_F(UserAgentTest, SendsTheRequestAsItWasMade) {
+TEST_F(UserAgentTest, SendsTheRequestUnchanged) {
   UseAnswer(kHello);
-  Exchanged();
+  ExchangeOnce();
   EXPECT_EQ(spec_->Streams().front()->Written(),
             "POST /sts HTTP/1.1\r\nHost: sts.example:443\r\nContent-Length: 4\r\n\r\n<a/>");
 }
@@ -27,14 +39,14 @@ struct HostCase {
 
 class HostFieldTest : public ExchangeFixture, public testing::WithParamInterface<HostCase> {};
 
-TEST_P(HostFieldTest, NamesThePortUnlessItIsTheSchemesOwn) {
+TEST_P(HostFieldTest, ContainsThePortUnlessItIsTheDefault) {
   ScriptedSpec::Script script;
   script.host = GetParam().host;
   script.endpointKey = GetParam().endpointKey;
   script.isTls = GetParam().isTls;
   script.stream.onWritten = AnswerWith(kHello);
   Use(script);
-  EXPECT_EQ(Exchanged(), "hello");
+  EXPECT_EQ(ExchangeOnce(), "hello");
   EXPECT_NE(spec_->Streams().front()->Written().find("\r\nHost: " + std::string(GetParam().field) +
                                                      "\r\n"),
             std::string::npos)
@@ -42,7 +54,7 @@ TEST_P(HostFieldTest, NamesThePortUnlessItIsTheSchemesOwn) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    UserAgent, HostFieldTest,
+    Hosts, HostFieldTest,
     testing::Values(HostCase{"sts.example", "sts.example:443", true, "sts.example"},
                     HostCase{"sts.example", "sts.example:80", false, "sts.example"},
                     HostCase{"sts.example", "sts.example:443", false, "sts.example:443"},
@@ -63,18 +75,18 @@ TEST_P(BadHostTest, IsRefusedBeforeAnythingIsSent) {
   EXPECT_EQ(spec_->ConnectCount(), 0U);
 }
 
-INSTANTIATE_TEST_SUITE_P(UserAgent, BadHostTest,
+INSTANTIATE_TEST_SUITE_P(Hosts, BadHostTest,
                          testing::Values("", " ", "sts example", "sts.example\r\nX: y",
                                          "sts\nexample", std::string("sts\0example", 11),
                                          "sts.example/", "a@b"));
 
-TEST_F(UserAgentTest, NamesTheWholeUrlToAProxy) {
+TEST_F(UserAgentTest, SendsTheWholeUrlToAProxy) {
   ScriptedSpec::Script script;
   script.isProxy = true;
   script.endpointKey = "sts.example:8080";
   script.stream.onWritten = AnswerWith(kHello);
   Use(script);
-  Exchanged();
+  ExchangeOnce();
   EXPECT_TRUE(spec_->Streams().front()->Written().starts_with(
       "POST http://sts.example:8080/sts HTTP/1.1\r\nHost: sts.example:8080\r\n"));
 }
@@ -82,36 +94,36 @@ TEST_F(UserAgentTest, NamesTheWholeUrlToAProxy) {
 TEST_F(UserAgentTest, RefusesToSendARequestTwice) {
   UseAnswer(kHello);
   const auto request = PostRequest();
-  const auto heard = std::make_shared<Heard>();
-  const auto item = agent_->SendAsync(request.get(), Hear(heard), 0);
-  EXPECT_THROW(agent_->SendAsync(request.get(), Hear(heard), 0), InvalidStateException);
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = agent_->SendAsync(request.get(), RecordIn(record), 0);
+  EXPECT_THROW(agent_->SendAsync(request.get(), RecordIn(record), 0), InvalidStateException);
   agent_->Wait(item.get(), kPlentyOfTime);
-  EXPECT_EQ(heard->count, 1);
+  EXPECT_EQ(record->count, 1);
 }
 
 TEST_F(UserAgentTest, RefusesNullAndForeignArguments) {
   UseAnswer(kHello);
-  EXPECT_THROW(agent_->SendAsync(nullptr, Hear(std::make_shared<Heard>()), 0),
+  EXPECT_THROW(agent_->SendAsync(nullptr, RecordIn(std::make_shared<CompletionRecord>()), 0),
                InvalidArgumentException);
   EXPECT_THROW(agent_->SendAsync(PostRequest().get(), nullptr, 0), InvalidArgumentException);
   EXPECT_THROW(agent_->Wait(nullptr, 0), TypeMismatchException);
   EXPECT_THROW(CreateHttpUserAgent(nullptr, nullptr, nullptr), TypeMismatchException);
 }
 
-TEST_F(UserAgentTest, SendsOnTheCookiesThatItWasGiven) {
+TEST_F(UserAgentTest, SendsTheCookiesThatItReceived) {
   const auto cookies = CreateCookieStore("");
   ScriptedSpec::Script script;
   script.stream.onWritten =
       AnswerWith(HeadWith("Set-Cookie: leg=1; HttpOnly\r\nX: y\r\nset-cookie: node=7\r\n"));
   Use(script, cookies.get());
-  Exchanged();
+  ExchangeOnce();
   EXPECT_EQ(spec_->Streams().front()->Written().find("Cookie:"), std::string::npos);
-  Exchanged();
+  ExchangeOnce();
   EXPECT_NE(spec_->Streams().front()->Written().find("\r\nCookie: leg=1; node=7\r\n"),
             std::string::npos);
 }
 
-TEST_F(UserAgentTest, HasTheCookiesInTheStoreBeforeTheCompletionRuns) {
+TEST_F(UserAgentTest, StoresCookiesBeforeTheCompletionRuns) {
   const auto cookies = CreateCookieStore("");
   ScriptedSpec::Script script;
   script.stream.onWritten = AnswerWith(HeadWith("Set-Cookie: leg=1\r\n"));
@@ -127,20 +139,20 @@ TEST_F(UserAgentTest, HasTheCookiesInTheStoreBeforeTheCompletionRuns) {
   EXPECT_EQ(seen, "leg=1");
 }
 
-TEST_F(UserAgentTest, KeepsCookiesOfAnotherHostOut) {
+TEST_F(UserAgentTest, IgnoresCookiesForAnotherHost) {
   const auto cookies = CreateCookieStore("");
   const System::DateTime now = System::GetUtcDateTime();
   cookies->Store("other.example", "/", true, "other=1; Path=/", now);
   ScriptedSpec::Script script;
   script.stream.onWritten = AnswerWith(HeadWith("Set-Cookie: evil=1; Domain=other.example\r\n"));
   Use(script, cookies.get());
-  Exchanged();
-  Exchanged();
+  ExchangeOnce();
+  ExchangeOnce();
   EXPECT_EQ(spec_->Streams().front()->Written().find("Cookie:"), std::string::npos);
   EXPECT_EQ(cookies->HeaderFor("other.example", "/", true, now), "other=1");
 }
 
-TEST_F(UserAgentTest, SendsSecureCookiesOverTlsAlone) {
+TEST_F(UserAgentTest, SendsSecureCookiesOnlyOverTls) {
   const auto cookies = CreateCookieStore("");
   cookies->Store("sts.example", "/", true, "s=1; Secure; Path=/", System::GetUtcDateTime());
   for (const bool isTls : {true, false}) {
@@ -148,24 +160,24 @@ TEST_F(UserAgentTest, SendsSecureCookiesOverTlsAlone) {
     script.isTls = isTls;
     script.stream.onWritten = AnswerWith(kHello);
     Use(script, cookies.get());
-    Exchanged();
+    ExchangeOnce();
     EXPECT_EQ(spec_->Streams().front()->Written().find("\r\nCookie: s=1\r\n") != std::string::npos,
               isTls);
   }
 }
 
-TEST_F(UserAgentTest, TakesThePathOfCookiesFromAWholeUrl) {
+TEST_F(UserAgentTest, MatchesCookiePathsAgainstAWholeUrl) {
   const auto cookies = CreateCookieStore("");
   cookies->Store("sts.example", "/", true, "s=1; Path=/deep", System::GetUtcDateTime());
   ScriptedSpec::Script script;
   script.stream.onWritten = AnswerWith(kHello);
   Use(script, cookies.get());
-  const auto heard = std::make_shared<Heard>();
+  const auto record = std::make_shared<CompletionRecord>();
   const auto item =
-      agent_->SendAsync(PostRequest("", "https://sts.example/deep/x").get(), Hear(heard), 0);
+      agent_->SendAsync(PostRequest("", "https://sts.example/deep/x").get(), RecordIn(record), 0);
   agent_->Wait(item.get(), kPlentyOfTime);
   EXPECT_NE(spec_->Streams().front()->Written().find("\r\nCookie: s=1\r\n"), std::string::npos);
 }
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

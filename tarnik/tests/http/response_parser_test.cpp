@@ -1,21 +1,26 @@
 #include "http/response_parser.h"
 
+#include <gtest/gtest.h>
 #include <tarnik/http/http_exception.h>
 #include <tarnik/http/http_user_agent.h>
 
-namespace Tarnik::Http {
+#include <algorithm>
+#include <cstddef>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <tuple>
+#include <utility>
+
+#include "http/response_body.h"
+#include "support/thrown_message.h"
+
+namespace Tarnik::Testing {
 namespace {
 
-constexpr const char* kPeer = "sts.example:443";
+using namespace Tarnik::Http;
 
-std::string BodyOf(const ClientResponse& response) {
-  std::string body;
-  char buffer[1000];
-  while (const std::size_t count = response.Body()->Read(buffer, sizeof(buffer))) {
-    body.append(buffer, count);
-  }
-  return body;
-}
+constexpr const char* kPeer = "sts.example:443";
 
 void FeedInPieces(ResponseParser& parser, std::string_view bytes, std::size_t pieceSize) {
   for (; !bytes.empty(); bytes.remove_prefix(std::min(pieceSize, bytes.size()))) {
@@ -23,16 +28,15 @@ void FeedInPieces(ResponseParser& parser, std::string_view bytes, std::size_t pi
   }
 }
 
-/// The message with which `bytes`, and then the end of the connection, are refused; empty if not.
+/// The message that refuses `bytes` followed by the end of the connection; empty if accepted.
 std::string RefusalOf(const std::string& bytes, std::size_t pieceSize) {
   ResponseParser parser(kPeer);
-  try {
-    FeedInPieces(parser, bytes, pieceSize);
-    parser.FeedEnd();
-  } catch (const HttpException& exception) {
-    return exception.Message();
-  }
-  return {};
+  return ThrownMessage<HttpException>(
+      [&] {
+        FeedInPieces(parser, bytes, pieceSize);
+        parser.FeedEnd();
+      },
+      "");
 }
 
 struct GoodAnswer {
@@ -90,11 +94,11 @@ const GoodAnswer kGoodAnswers[] = {
     {"HTTP/1.1 204 No Content\r\n\r\nsurplus", 204, "No Content", "", false},
 };
 
-INSTANTIATE_TEST_SUITE_P(ResponseParser, GoodAnswerTest,
+INSTANTIATE_TEST_SUITE_P(Answers, GoodAnswerTest,
                          testing::Combine(testing::ValuesIn(kGoodAnswers),
                                           testing::Values<std::size_t>(1, 2, 3, 7, 100000)));
 
-TEST(ResponseParser, FindsHeadersWithoutRegardToCaseAndTakesTheFirst) {
+TEST(ResponseParserTest, FindsTheFirstHeaderIgnoringCase) {
   ResponseParser parser(kPeer);
   parser.Feed("HTTP/1.1 200 OK\r\nX-Id:  one two \r\nx-id: three\r\nContent-Length: 0\r\n\r\n");
   const auto response = parser.TakeResponse();
@@ -102,7 +106,7 @@ TEST(ResponseParser, FindsHeadersWithoutRegardToCaseAndTakesTheFirst) {
   EXPECT_EQ(response->Header("absent"), std::nullopt);
 }
 
-TEST(ResponseParser, KeepsTrailersOutOfTheHeaders) {
+TEST(ResponseParserTest, KeepsTrailersOutOfTheHeaders) {
   ResponseParser parser(kPeer);
   parser.Feed(
       "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n0\r\nSet-Cookie: evil=1\r\n\r\n");
@@ -110,13 +114,13 @@ TEST(ResponseParser, KeepsTrailersOutOfTheHeaders) {
   EXPECT_EQ(parser.TakeResponse()->Header("Set-Cookie"), std::nullopt);
 }
 
-TEST(ResponseParser, KeepsHeadersOfInterimAnswersOutOfTheFinalOne) {
+TEST(ResponseParserTest, KeepsHeadersOfInterimAnswersOutOfTheFinalOne) {
   ResponseParser parser(kPeer);
   parser.Feed("HTTP/1.1 103 Early\r\nX: 1\r\n\r\nHTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n");
   EXPECT_EQ(parser.TakeResponse()->Header("X"), std::nullopt);
 }
 
-TEST(ResponseParser, ReadsABodyWithoutLengthUntilTheConnectionEnds) {
+TEST(ResponseParserTest, ReadsABodyWithoutLengthUntilTheConnectionEnds) {
   ResponseParser parser(kPeer);
   FeedInPieces(parser, "HTTP/1.1 200 OK\r\n\r\nhello", 1);
   EXPECT_FALSE(parser.IsDone());
@@ -126,13 +130,13 @@ TEST(ResponseParser, ReadsABodyWithoutLengthUntilTheConnectionEnds) {
   EXPECT_EQ(BodyOf(*parser.TakeResponse()), "hello");
 }
 
-TEST(ResponseParser, RefusesAnEndBeforeAnyByte) {
+TEST(ResponseParserTest, RefusesAnEndBeforeTheFirstByte) {
   EXPECT_EQ(RefusalOf("", 1), "sts.example:443 closed the connection without an answer.");
 }
 
-class CutAnswerTest : public testing::TestWithParam<std::string> {};
+class TruncatedAnswerTest : public testing::TestWithParam<std::string> {};
 
-TEST_P(CutAnswerTest, IsRefusedWhereverItIsCut) {
+TEST_P(TruncatedAnswerTest, IsRefusedWhereverItIsCut) {
   const std::string& answer = GetParam();
   const std::size_t headSize = answer.rfind("\r\n\r\n", answer.find("hello")) + 4;
   for (std::size_t size = 1; size < answer.size(); ++size) {
@@ -145,7 +149,7 @@ TEST_P(CutAnswerTest, IsRefusedWhereverItIsCut) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    ResponseParser, CutAnswerTest,
+    Answers, TruncatedAnswerTest,
     testing::Values(
         "HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\nContent-Length: 5\r\n\r\nhello",
         "HTTP/1.0 200 OK\r\nContent-Length: 5\r\n\r\nhello",
@@ -269,7 +273,7 @@ const BadAnswer kBadAnswers[] = {
     {Chunks("1000000\r\n"), "was cut off in its body"},
 };
 
-INSTANTIATE_TEST_SUITE_P(ResponseParser, BadAnswerTest,
+INSTANTIATE_TEST_SUITE_P(Answers, BadAnswerTest,
                          testing::Combine(testing::ValuesIn(kBadAnswers),
                                           testing::Values<std::size_t>(1, 4, 100000)));
 
@@ -280,7 +284,7 @@ TEST_P(BadChunkLineEndTest, IsRefused) {
   EXPECT_NE(RefusalOf(Chunks(GetParam()), 1), "");
 }
 
-INSTANTIATE_TEST_SUITE_P(ResponseParser, BadChunkLineEndTest,
+INSTANTIATE_TEST_SUITE_P(Bodies, BadChunkLineEndTest,
                          testing::Values("1\nh\n0\n\n", "1\rh\r\n0\r\n\r\n", "1\r\nh\n0\r\n\r\n",
                                          "0\r\nX\r\n\r\n", "0\r\nContent-Length: 5\r\n\r\n",
                                          "0\r\nTransfer-Encoding: chunked\r\n\r\n",
@@ -295,14 +299,14 @@ std::string HeadOfSize(std::size_t size) {
 const std::string kHeaderLimit =
     "The answer from sts.example:443 has a header of more than 65536 bytes.";
 
-TEST(ResponseParserLimits, AcceptsTheLargestHeaderAndRefusesALargerOne) {
+TEST(ResponseParserLimitsTest, AcceptsTheLargestHeaderAndRefusesALargerOne) {
   for (const std::size_t pieceSize : {std::size_t{1}, std::size_t{16384}, std::size_t{1000000}}) {
     EXPECT_EQ(RefusalOf(HeadOfSize(kMaxHeaderBytes), pieceSize), "");
     EXPECT_EQ(RefusalOf(HeadOfSize(kMaxHeaderBytes + 1), pieceSize), kHeaderLimit);
   }
 }
 
-TEST(ResponseParserLimits, RefusesAHeaderWithoutEndAsSoonAsItIsTooLong) {
+TEST(ResponseParserLimitsTest, RefusesAnEndlessHeaderAsSoonAsItIsTooLong) {
   ResponseParser parser(kPeer);
   std::size_t fed = 0;
   const auto feedForEver = [&] {
@@ -315,14 +319,14 @@ TEST(ResponseParserLimits, RefusesAHeaderWithoutEndAsSoonAsItIsTooLong) {
   EXPECT_LE(fed, kMaxHeaderBytes);
 }
 
-TEST(ResponseParserLimits, CountsInterimHeadersTowardsTheHeader) {
+TEST(ResponseParserLimitsTest, CountsInterimHeadersTowardsTheHeaderLimit) {
   const std::string interim = "HTTP/1.1 100 Continue\r\n\r\n";
   EXPECT_EQ(RefusalOf(interim + HeadOfSize(kMaxHeaderBytes - interim.size()), 1000), "");
   EXPECT_EQ(RefusalOf(interim + HeadOfSize(kMaxHeaderBytes - interim.size() + 1), 1000),
             kHeaderLimit);
 }
 
-TEST(ResponseParserLimits, PassesOverSixteenInterimAnswersAndNoMore) {
+TEST(ResponseParserLimitsTest, SkipsAtMostSixteenInterimAnswers) {
   std::string answers;
   for (int i = 0; i < 16; ++i) {
     answers += "HTTP/1.1 102 Processing\r\n\r\n";
@@ -333,7 +337,7 @@ TEST(ResponseParserLimits, PassesOverSixteenInterimAnswersAndNoMore) {
             "The answer from sts.example:443 is preceded by more than 16 interim answers.");
 }
 
-TEST(ResponseParserLimits, AcceptsTheLargestBodyByLength) {
+TEST(ResponseParserLimitsTest, AcceptsTheLargestBodyByLength) {
   ResponseParser parser(kPeer);
   parser.Feed("HTTP/1.1 200 OK\r\nContent-Length: 16777216\r\n\r\n");
   FeedInPieces(parser, std::string(kMaxBodyBytes, 'x'), 16384);
@@ -341,7 +345,7 @@ TEST(ResponseParserLimits, AcceptsTheLargestBodyByLength) {
   EXPECT_EQ(BodyOf(*parser.TakeResponse()).size(), kMaxBodyBytes);
 }
 
-TEST(ResponseParserLimits, StopsAtTheLimitOfABodyInChunks) {
+TEST(ResponseParserLimitsTest, StopsAtTheLimitOfAChunkedBody) {
   ResponseParser parser(kPeer);
   parser.Feed("HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\nffffff\r\n");
   FeedInPieces(parser, std::string(kMaxBodyBytes - 1, 'x'), 16384);
@@ -349,7 +353,7 @@ TEST(ResponseParserLimits, StopsAtTheLimitOfABodyInChunks) {
   EXPECT_THROW(parser.Feed("1\r\n"), HttpException);
 }
 
-TEST(ResponseParserLimits, StopsAtTheLimitOfABodyUntilTheEnd) {
+TEST(ResponseParserLimitsTest, StopsAtTheLimitOfABodyWithoutLength) {
   ResponseParser parser(kPeer);
   parser.Feed("HTTP/1.1 200 OK\r\n\r\n");
   FeedInPieces(parser, std::string(kMaxBodyBytes, 'x'), 16384);
@@ -378,14 +382,14 @@ TEST_P(EndlessFramingTest, IsRefusedSoon) {
   EXPECT_LE(fed, 3 * kMaxHeaderBytes);
 }
 
-INSTANTIATE_TEST_SUITE_P(ResponseParser, EndlessFramingTest,
+INSTANTIATE_TEST_SUITE_P(Repetitions, EndlessFramingTest,
                          testing::Values(std::pair{"1", ";extension"},
                                          std::pair{"1;a=\"", "aaaaaaaaaaaaaaaa"},
                                          std::pair{"0", "0000000000000000"},
                                          std::pair{"0\r\n", "Trailer: x\r\n"},
                                          std::pair{"", "1;extension=that-is-long\r\nx\r\n"}));
 
-TEST(ResponseParserLimits, AcceptsABodyInChunksOfOneByte) {
+TEST(ResponseParserLimitsTest, AcceptsABodyInChunksOfOneByte) {
   ResponseParser parser(kPeer);
   parser.Feed("HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n");
   for (int i = 0; i < 100000; ++i) {
@@ -397,4 +401,4 @@ TEST(ResponseParserLimits, AcceptsABodyInChunksOfOneByte) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Http
+}  // namespace Tarnik::Testing

@@ -1,16 +1,18 @@
 #include <tarnik/service/log.h>
 
 #include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
 
 #include <mutex>
 #include <stdexcept>
+#include <string>
 #include <thread>
 #include <vector>
 
-#include <tarnik/core/exception.h>
-
-namespace Tarnik::Service {
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Service;
 
 struct Line {
   std::string logger;
@@ -18,7 +20,7 @@ struct Line {
   std::string text;
 };
 
-class LogTest : public ::testing::Test {
+class LogTest : public testing::Test {
  protected:
   LogTest() {
     SetLogSink([this](const LogRecord& record) {
@@ -58,25 +60,25 @@ TEST_F(LogTest, RefusesLevelsOutsideTheScale) {
   EXPECT_THROW(SetLogLevel("LogTest.Range", 10), InvalidArgumentException);
 }
 
-TEST_F(LogTest, OneCallIsOneLine) {
+TEST_F(LogTest, WritesEachCallAsOneLine) {
   const StaticLogger logger("LogTest.Escape");
   LogInternal(logger, 1, "%1", {"a\nforged line\r\x1b[31m\x7f\xC3\xA4"});
   ASSERT_EQ(lines_.size(), 1U);
   EXPECT_EQ(lines_[0].text, "a\\x0aforged line\\x0d\\x1b[31m\\x7f\xC3\xA4");
 }
 
-TEST_F(LogTest, SinkThatThrowsDoesNotDisturbTheCaller) {
+TEST_F(LogTest, SinkThatThrowsDoesNotAffectTheCaller) {
   SetLogSink([](const LogRecord&) { throw std::runtime_error("full"); });
   const StaticLogger logger("LogTest.Throw");
   LogInternal(logger, 1, "line", {});
 }
 
-TEST_F(LogTest, EmptySinkBringsBackStandardError) {
+TEST_F(LogTest, EmptySinkRestoresStandardError) {
   const StaticLogger logger("LogTest.Default");
   SetLogSink({});
-  ::testing::internal::CaptureStderr();
+  testing::internal::CaptureStderr();
   LogInternal(logger, 2, "to %1", {"stderr"});
-  const std::string output = ::testing::internal::GetCapturedStderr();
+  const std::string output = testing::internal::GetCapturedStderr();
   EXPECT_NE(output.find(" 2 LogTest.Default: to stderr\n"), std::string::npos) << output;
   EXPECT_TRUE(lines_.empty());
 }
@@ -98,4 +100,4 @@ TEST_F(LogTest, ConcurrentLinesAllArrive) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Service
+}  // namespace Tarnik::Testing

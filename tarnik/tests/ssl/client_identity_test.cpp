@@ -3,26 +3,29 @@
 #include <gtest/gtest.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/crypto/private_key.h>
+#include <tarnik/crypto/public_key.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/ssl/ssl_exception.h>
 
 #include <string>
 
 #include "ssl/tls_fixture.h"
 #include "support/key_texts.h"
+#include "support/openssl.h"
+#include "support/outcome.h"
+#include "support/test_certificates.h"
+#include "support/test_pki.h"
+#include "support/thrown_message.h"
+#include "support/tls_peer.h"
 
-namespace Tarnik::Ssl {
+namespace Tarnik::Testing {
 namespace {
 
-using Testing::Identity;
-using Testing::IdentityOptions;
-using Testing::MakeCa;
-using Testing::MakeIdentity;
-using Testing::TestPki;
-using Testing::TlsClient;
-using Testing::TlsPeerOptions;
-using Testing::TlsServer;
+using namespace Tarnik::Ssl;
 
 Ref<const Crypto::PrivateKey> KeyOf(const Identity& identity) {
-  return Crypto::CreatePrivateKeyFromPem(Tests::ToPkcs8Pem(identity.key.get()));
+  return Crypto::CreatePrivateKeyFromPem(ToPkcs8Pem(identity.key.get()));
 }
 
 Identity MakeClient(const Identity& issuer) {
@@ -39,14 +42,8 @@ const Identity& Client() {
   return *client;
 }
 
-SSLContextConfig Trusting() {
-  SSLContextConfig config;
-  config.caCertificates = {TestPki::Get().root.ToCertificate()};
-  return config;
-}
-
-SSLContextConfig ShowingClient() {
-  SSLContextConfig config = Trusting();
+SSLContextConfig SendingClient() {
+  SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   config.clientCertificate = Client().ToCertificate();
   config.clientPrivateKey = KeyOf(Client());
   config.clientCertificateChain = {TestPki::Get().intermediate.ToCertificate()};
@@ -59,23 +56,18 @@ std::string DerOf(const Identity& identity) {
 }
 
 std::string RefusalOf(const SSLContextConfig& config) {
-  try {
-    CreateSSLContext(config);
-  } catch (const SSLException& error) {
-    return error.Message();
-  }
-  return "made";
+  return ThrownMessage<SSLException>([&config] { CreateSSLContext(config); }, "created");
 }
 
-class ClientIdentity : public testing::TestWithParam<int> {
+class ClientIdentityTest : public testing::TestWithParam<int> {
  protected:
-  ClientIdentity() {
+  ClientIdentityTest() {
     peer_.identity = &TestPki::Get().leaf;
     peer_.minVersion = peer_.maxVersion = GetParam();
     peer_.clientCa = &TestPki::Get().root;
   }
 
-  /// The first error of a handshake and of reading what the server says, or that.
+  /// What the server sends after the handshake, or the first error of the handshake or the read.
   static std::string Exchange(SSLContext& context, int port) {
     const TlsClient client(context, port);
     if (!client.Message().empty()) {
@@ -83,22 +75,22 @@ class ClientIdentity : public testing::TestWithParam<int> {
       return client.Message();
     }
     std::string error;
-    const std::string said = Testing::ReadAll(client.Stream(), 100, &error);
-    return error.empty() ? said : error;
+    const std::string received = ReadAll(client.Stream(), 100, &error);
+    return error.empty() ? received : error;
   }
 
   TlsPeerOptions peer_;
 };
 
-TEST_P(ClientIdentity, IsShownToAPeerThatDemandsIt) {
+TEST_P(ClientIdentityTest, IsSentToAPeerThatRequiresIt) {
   TlsServer server(peer_, 1);
-  EXPECT_EQ(Exchange(*CreateSSLContext(ShowingClient()), server.Port()), "hello");
+  EXPECT_EQ(Exchange(*CreateSSLContext(SendingClient()), server.Port()), "hello");
   EXPECT_EQ(server.Join()[0].clientCertificate, DerOf(Client()));
 }
 
-TEST_P(ClientIdentity, IsMissedByAPeerThatDemandsIt) {
+TEST_P(ClientIdentityTest, IsReportedAsMissingByAPeerThatRequiresIt) {
   TlsServer server(peer_, 1);
-  EXPECT_EQ(Exchange(*CreateSSLContext(Trusting()), server.Port()),
+  EXPECT_EQ(Exchange(*CreateSSLContext(TrustingConfig(TestPki::Get().root)), server.Port()),
             GetParam() == TLS1_2_VERSION
                 ? "TLS handshake with sts.example failed: sslv3 alert handshake failure"
                 : "Cannot read from the TLS connection with sts.example: tlsv13 alert certificate "
@@ -106,76 +98,77 @@ TEST_P(ClientIdentity, IsMissedByAPeerThatDemandsIt) {
   EXPECT_FALSE(server.Join()[0].accepted);
 }
 
-// The twin of the first: the peer finds the issuer in what is sent, not elsewhere.
-TEST_P(ClientIdentity, IsNotBelievedWithoutItsChain) {
+// The counterpart of the first test: the peer finds the issuer only in what is sent.
+TEST_P(ClientIdentityTest, IsRefusedByThePeerWithoutItsChain) {
   TlsServer server(peer_, 1);
-  SSLContextConfig config = ShowingClient();
+  SSLContextConfig config = SendingClient();
   config.clientCertificateChain.clear();
-  // Trusted by the client, and yet not sent.
+  // Trusted by the client, but not sent.
   config.caCertificates.push_back(TestPki::Get().intermediate.ToCertificate());
   EXPECT_NE(Exchange(*CreateSSLContext(config), server.Port()), "hello");
   EXPECT_FALSE(server.Join()[0].accepted);
 }
 
-TEST_P(ClientIdentity, IsNotShownToAPeerThatDoesNotAsk) {
+TEST_P(ClientIdentityTest, IsNotSentToAPeerThatDoesNotAsk) {
   peer_.clientCa = nullptr;
   TlsServer server(peer_, 1);
-  EXPECT_EQ(Exchange(*CreateSSLContext(ShowingClient()), server.Port()), "hello");
+  EXPECT_EQ(Exchange(*CreateSSLContext(SendingClient()), server.Port()), "hello");
   EXPECT_EQ(server.Join()[0].clientCertificate, "");
 }
 
-TEST_P(ClientIdentity, StaysWithItsContextWhenSessionsAreResumed) {
+TEST_P(ClientIdentityTest, IsNotSharedWithAnotherContextByResumption) {
   TlsServer server(peer_, 3);
-  const auto context = CreateSSLContext(ShowingClient());
+  const auto context = CreateSSLContext(SendingClient());
   EXPECT_EQ(Exchange(*context, server.Port()), "hello");
   EXPECT_EQ(Exchange(*context, server.Port()), "hello");
-  EXPECT_NE(Exchange(*CreateSSLContext(Trusting()), server.Port()), "hello");
+  EXPECT_NE(Exchange(*CreateSSLContext(TrustingConfig(TestPki::Get().root)), server.Port()),
+            "hello");
   EXPECT_FALSE(server.Join()[0].resumed);
   EXPECT_TRUE(server.Join()[1].resumed);
   EXPECT_FALSE(server.Join()[2].resumed);
   EXPECT_FALSE(server.Join()[2].accepted);
 }
 
-INSTANTIATE_TEST_SUITE_P(Versions, ClientIdentity, testing::Values(TLS1_2_VERSION, TLS1_3_VERSION),
-                         Testing::NameOfVersion);
+INSTANTIATE_TEST_SUITE_P(Versions, ClientIdentityTest,
+                         testing::Values(TLS1_2_VERSION, TLS1_3_VERSION), NameOfVersion);
 
-TEST(ClientIdentityConfig, IsRefusedInHalves) {
-  SSLContextConfig keyless = ShowingClient();
+TEST(ClientIdentityConfigTest, IsRefusedWhenIncomplete) {
+  SSLContextConfig keyless = SendingClient();
   keyless.clientPrivateKey = nullptr;
   EXPECT_EQ(RefusalOf(keyless),
             "The SSL context has a client certificate without the private key that belongs to it.");
-  SSLContextConfig bare = ShowingClient();
+  SSLContextConfig bare = SendingClient();
   bare.clientCertificate = nullptr;
   EXPECT_EQ(
       RefusalOf(bare),
       "The SSL context has a client's private key without the certificate that belongs to it.");
-  SSLContextConfig chainAlone = ShowingClient();
-  chainAlone.clientPrivateKey = nullptr;
-  chainAlone.clientCertificate = nullptr;
-  EXPECT_EQ(RefusalOf(chainAlone),
+  SSLContextConfig onlyChain = SendingClient();
+  onlyChain.clientPrivateKey = nullptr;
+  onlyChain.clientCertificate = nullptr;
+  EXPECT_EQ(RefusalOf(onlyChain),
             "The SSL context has a client's chain without a client certificate.");
 }
 
-TEST(ClientIdentityConfig, IsRefusedWhenKeyAndCertificateAreStrangers) {
-  SSLContextConfig config = ShowingClient();
+TEST(ClientIdentityConfigTest, IsRefusedWhenKeyAndCertificateDoNotMatch) {
+  SSLContextConfig config = SendingClient();
   config.clientPrivateKey = KeyOf(TestPki::Get().leaf);
   EXPECT_EQ(RefusalOf(config),
             "The client's private key does not belong to the client certificate CN=client.");
 }
 
-TEST(ClientIdentityConfig, IsRefusedWithANullInItsChain) {
-  SSLContextConfig config = ShowingClient();
+TEST(ClientIdentityConfigTest, IsRefusedWithANullInItsChain) {
+  SSLContextConfig config = SendingClient();
   config.clientCertificateChain.push_back(nullptr);
   EXPECT_THROW(CreateSSLContext(config), InvalidArgumentException);
 }
 
-TEST(ClientIdentityConfig, IsRefusedWhenTlsFindsItTooWeak) {
-  const OpenSsl::OwnedKey weak = Tests::MakeRsaKey(1024);
-  Tests::CertificateRecipe recipe;
+TEST(ClientIdentityConfigTest, IsRefusedWhenItIsTooWeakForTls) {
+  const OpenSsl::OwnedKey weak = MakeRsaKey(1024);
+  CertificateRecipe recipe;
   recipe.key = weak.get();
   SSLContextConfig config;
-  config.clientCertificate = Tests::MakeCertificate(recipe);
-  config.clientPrivateKey = Crypto::CreatePrivateKeyFromPem(Tests::ToPkcs8Pem(weak.get()));
+  config.clientCertificate = MakeCertificate(recipe);
+  config.clientPrivateKey = Crypto::CreatePrivateKeyFromPem(ToPkcs8Pem(weak.get()));
   EXPECT_EQ(RefusalOf(config),
             "Cannot use the client certificate CN=signer,O=Test\\, Inc.: ee key too small.");
 }
@@ -186,11 +179,11 @@ class StrangeKey final : public Crypto::PrivateKey, public ObjectImpl {
   bool Matches(const Crypto::Certificate&) const override { return true; }
 };
 
-TEST(ClientIdentityConfig, IsRefusedWithAKeyOfAnotherMake) {
-  SSLContextConfig config = ShowingClient();
+TEST(ClientIdentityConfigTest, IsRefusedWithAKeyOfAnotherImplementation) {
+  SSLContextConfig config = SendingClient();
   config.clientPrivateKey = MakeRef<StrangeKey>();
   EXPECT_EQ(RefusalOf(config), "The client's private key was not made by this library.");
 }
 
 }  // namespace
-}  // namespace Tarnik::Ssl
+}  // namespace Tarnik::Testing

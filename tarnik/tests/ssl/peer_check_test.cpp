@@ -2,27 +2,24 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/ssl/ssl_exception.h>
 
 #include <ostream>
 #include <string>
 #include <vector>
 
 #include "ssl/tls_fixture.h"
+#include "support/test_pki.h"
+#include "support/tls_peer.h"
 
-namespace Tarnik::Ssl {
+namespace Tarnik::Testing {
 namespace {
 
-using Testing::Identity;
-using Testing::IdentityOptions;
-using Testing::MakeIdentity;
-using Testing::TestPki;
-using Testing::TlsClient;
-using Testing::TlsPeerOptions;
-using Testing::TlsServer;
-using Testing::TrustingContext;
+using namespace Tarnik::Ssl;
 
-/// The message of a handshake with a server that presents `options`, issued by the trusted root;
-/// empty when it succeeds.
+/// The message of a handshake with a server whose certificate is made by `options` and issued by
+/// the trusted root; empty when it succeeds.
 std::string HandshakeWith(const IdentityOptions& options, const std::string& host,
                           const std::string& serverName = "") {
   const Identity leaf = MakeIdentity(options, &TestPki::Get().root);
@@ -48,9 +45,9 @@ std::ostream& operator<<(std::ostream& stream, const NameCase& nameCase) {
   return stream << nameCase.what;
 }
 
-class PeerCheckNames : public testing::TestWithParam<NameCase> {};
+class PeerCheckNameTest : public testing::TestWithParam<NameCase> {};
 
-TEST_P(PeerCheckNames, ComparesTheExpectedPeerWithTheCertificate) {
+TEST_P(PeerCheckNameTest, ComparesTheExpectedPeerWithTheCertificate) {
   const NameCase& nameCase = GetParam();
   IdentityOptions options;
   options.commonName = "leaf";
@@ -63,7 +60,7 @@ TEST_P(PeerCheckNames, ComparesTheExpectedPeerWithTheCertificate) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Cases, PeerCheckNames,
+    Cases, PeerCheckNameTest,
     testing::Values(
         NameCase{"the name", {"sts.example"}, {}, "sts.example", true},
         NameCase{"the name in other case", {"STS.example"}, {}, "sts.EXAMPLE", true},
@@ -93,7 +90,7 @@ INSTANTIATE_TEST_SUITE_P(
         NameCase{"a wildcard for an address", {"*.0.0.1"}, {}, "127.0.0.1", false},
         NameCase{"an address for a name", {}, {"127.0.0.1"}, "localhost", false}));
 
-TEST(PeerCheck, LeavesTheCommonNameOut) {
+TEST(PeerCheckTest, IgnoresTheCommonName) {
   IdentityOptions options;
   options.commonName = "sts.example";
   options.dnsNames = {};
@@ -102,18 +99,18 @@ TEST(PeerCheck, LeavesTheCommonNameOut) {
             "'sts.example'");
 }
 
-TEST(PeerCheck, ExpectsTheServerNameBeforeTheHost) {
+TEST(PeerCheckTest, PrefersTheServerNameToTheHost) {
   EXPECT_EQ(HandshakeWith({}, "10.0.0.1", "sts.example"), "");
   EXPECT_EQ(HandshakeWith({}, "sts.example", "other.example"),
             "TLS handshake with sts.example failed: the certificate (CN=sts.example) does not name "
             "'other.example'");
 }
 
-TEST(PeerCheck, TakesANameWithTheFullStopOfTheRoot) {
+TEST(PeerCheckTest, AcceptsANameWithATrailingDot) {
   EXPECT_EQ(HandshakeWith({}, "sts.example."), "");
 }
 
-TEST(PeerCheck, EscapesAndBoundsTheNamesThatAPeerChooses) {
+TEST(PeerCheckTest, EscapesTheNamesThatAPeerChooses) {
   IdentityOptions options;
   options.commonName = "a\r\nb\x01 \"";
   options.dnsNames = {};
@@ -128,7 +125,7 @@ struct DateCase {
   long notAfter;
 };
 
-TEST(PeerCheck, RefusesCertificatesOutsideTheirTime) {
+TEST(PeerCheckTest, RefusesCertificatesOutsideTheirValidity) {
   for (const DateCase& dates : {DateCase{"certificate has expired", -7200, -60},
                                 DateCase{"certificate is not yet valid", 60, 7200}}) {
     IdentityOptions options;
@@ -140,7 +137,7 @@ TEST(PeerCheck, RefusesCertificatesOutsideTheirTime) {
   }
 }
 
-TEST(PeerCheck, RefusesACertificateForClients) {
+TEST(PeerCheckTest, RefusesACertificateForClientsOnly) {
   IdentityOptions options;
   options.extendedKeyUsage = "clientAuth";
   EXPECT_THAT(HandshakeWith(options, "sts.example"),
@@ -149,7 +146,7 @@ TEST(PeerCheck, RefusesACertificateForClients) {
   EXPECT_EQ(HandshakeWith(options, "sts.example"), "");
 }
 
-TEST(PeerCheck, SendsNamesBySniButNotAddresses) {
+TEST(PeerCheckTest, SendsNamesBySniButNotAddresses) {
   IdentityOptions options;
   options.addresses = {"127.0.0.1"};
   const Identity leaf = MakeIdentity(options, &TestPki::Get().root);
@@ -168,8 +165,7 @@ TEST(PeerCheck, SendsNamesBySniButNotAddresses) {
 }
 
 std::string HandshakeWithPins(const std::vector<const Identity*>& pins) {
-  SSLContextConfig config;
-  config.caCertificates = {TestPki::Get().root.ToCertificate()};
+  SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   for (const Identity* pin : pins) {
     config.pinnedCertificates.push_back(pin->ToCertificate());
   }
@@ -180,7 +176,7 @@ std::string HandshakeWithPins(const std::vector<const Identity*>& pins) {
   return TlsClient(*context, server.Port()).Message();
 }
 
-TEST(PeerCheck, AcceptsAPinnedCertificateAlone) {
+TEST(PeerCheckTest, AcceptsOnlyAPinnedCertificate) {
   const Identity other = MakeIdentity({}, &TestPki::Get().root);
   EXPECT_EQ(HandshakeWithPins({&TestPki::Get().leaf}), "");
   EXPECT_EQ(HandshakeWithPins({&other, &TestPki::Get().leaf}), "");
@@ -192,7 +188,7 @@ TEST(PeerCheck, AcceptsAPinnedCertificateAlone) {
             "the pinned certificates");
 }
 
-TEST(PeerCheck, DoesNotTrustAPinnedCertificateForItsPinAlone) {
+TEST(PeerCheckTest, DoesNotTrustACertificateOnlyBecauseItIsPinned) {
   const Identity selfSigned = MakeIdentity({}, nullptr);
   SSLContextConfig config;
   config.pinnedCertificates = {selfSigned.ToCertificate()};
@@ -204,4 +200,4 @@ TEST(PeerCheck, DoesNotTrustAPinnedCertificateForItsPinAlone) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Ssl
+}  // namespace Tarnik::Testing

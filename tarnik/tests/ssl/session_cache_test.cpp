@@ -2,24 +2,28 @@
 
 #include <gtest/gtest.h>
 
+#include <chrono>
+#include <cstddef>
 #include <string>
 
 #include "ssl/tls_fixture.h"
+#include "support/openssl.h"
+#include "support/test_pki.h"
+#include "support/tls_peer.h"
 
-namespace Tarnik::Ssl {
+namespace Tarnik::Testing {
 namespace {
 
+using namespace Tarnik::Ssl;
 using namespace std::chrono_literals;
-using Testing::MakeIdentity;
-using Testing::TestPki;
 
-/// A session that looks like one of a handshake of `version` with the test's leaf.
-OpenSsl::OwnedSslSession MakeSession(int version, const Testing::Identity& leaf) {
-  // Only a real handshake leaves a peer certificate in a session.
-  Testing::TlsPeerOptions options;
+/// A session of a handshake of `version` with a server that presents `leaf`.
+OpenSsl::OwnedSslSession MakeSession(int version, const Identity& leaf) {
+  // Only a real handshake puts a peer certificate into a session.
+  TlsPeerOptions options;
   options.identity = &leaf;
   options.minVersion = options.maxVersion = version;
-  const auto serverContext = Testing::MakeServerContext(options);
+  const auto serverContext = MakeServerContext(options);
   const OpenSsl::OwnedSslContext clientContext(SSL_CTX_new(TLS_client_method()));
   const OpenSsl::OwnedSsl server(SSL_new(serverContext.get()));
   const OpenSsl::OwnedSsl client(SSL_new(clientContext.get()));
@@ -54,13 +58,13 @@ class SessionCacheTest : public testing::Test {
   SessionCache cache_;
 };
 
-TEST_F(SessionCacheTest, GivesASessionToItsPeerAlone) {
+TEST_F(SessionCacheTest, ReturnsASessionOnlyForItsPeer) {
   cache_.Put("a", CopyOf(tls12_), now_);
   EXPECT_EQ(cache_.Take("b", now_), nullptr);
   EXPECT_NE(cache_.Take("a", now_), nullptr);
 }
 
-TEST_F(SessionCacheTest, GivesATls13SessionOnceAndATls12SessionAgain) {
+TEST_F(SessionCacheTest, ReturnsATls13SessionOnceAndATls12SessionRepeatedly) {
   cache_.Put("a", CopyOf(tls13_), now_);
   EXPECT_NE(cache_.Take("a", now_), nullptr);
   EXPECT_EQ(cache_.Take("a", now_), nullptr);
@@ -69,15 +73,15 @@ TEST_F(SessionCacheTest, GivesATls13SessionOnceAndATls12SessionAgain) {
   EXPECT_NE(cache_.Take("a", now_), nullptr);
 }
 
-TEST_F(SessionCacheTest, ForgetsSessionsWithTime) {
+TEST_F(SessionCacheTest, DropsSessionsThatAreTooOld) {
   cache_.Put("a", CopyOf(tls12_), now_);
   EXPECT_NE(cache_.Take("a", now_ + SessionCache::kMaxAge - 1s), nullptr);
   EXPECT_EQ(cache_.Take("a", now_ + SessionCache::kMaxAge), nullptr);
   EXPECT_EQ(cache_.Size(), 0U);
 }
 
-TEST_F(SessionCacheTest, ForgetsASessionWhosePeerCertificateHasExpired) {
-  Testing::IdentityOptions options;
+TEST_F(SessionCacheTest, DropsASessionWhosePeerCertificateHasExpired) {
+  IdentityOptions options;
   options.notAfter = -60;
   const auto expired = MakeIdentity(options, &TestPki::Get().root);
   cache_.Put("a", MakeSession(TLS1_2_VERSION, expired), now_);
@@ -86,14 +90,14 @@ TEST_F(SessionCacheTest, ForgetsASessionWhosePeerCertificateHasExpired) {
   EXPECT_EQ(cache_.Size(), 0U);
 }
 
-TEST_F(SessionCacheTest, KeepsFewSessionsOfOnePeer) {
+TEST_F(SessionCacheTest, LimitsTheSessionsOfOnePeer) {
   for (std::size_t i = 0; i < SessionCache::kMaxSessionsOfPeer + 3; ++i) {
     cache_.Put("a", CopyOf(tls13_), now_);
   }
   EXPECT_EQ(cache_.Size(), SessionCache::kMaxSessionsOfPeer);
 }
 
-TEST_F(SessionCacheTest, DropsTheOldestPastItsBound) {
+TEST_F(SessionCacheTest, DropsTheOldestSessionBeyondItsLimit) {
   for (std::size_t i = 0; i < SessionCache::kMaxSessions + 1; ++i) {
     cache_.Put("peer " + std::to_string(i), CopyOf(tls12_), now_);
   }
@@ -103,4 +107,4 @@ TEST_F(SessionCacheTest, DropsTheOldestPastItsBound) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Ssl
+}  // namespace Tarnik::Testing

@@ -1,23 +1,20 @@
 #include <tarnik/ssl/ssl_context.h>
 
-#include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
 
 #include <string>
+#include <utility>
 
 #include "ssl/tls_fixture.h"
+#include "support/outcome.h"
+#include "support/test_pki.h"
+#include "support/tls_peer.h"
 
-namespace Tarnik::Ssl {
+namespace Tarnik::Testing {
 namespace {
 
-using Testing::Identity;
-using Testing::IdentityOptions;
-using Testing::MakeIdentity;
-using Testing::TestPki;
-using Testing::TlsClient;
-using Testing::TlsPeerOptions;
-using Testing::TlsServer;
-using Testing::TrustingContext;
+using namespace Tarnik::Ssl;
 
 std::string HandshakeWithLeaf(TlsPeerOptions peer) {
   if (peer.ciphers != "aNULL") {
@@ -27,7 +24,7 @@ std::string HandshakeWithLeaf(TlsPeerOptions peer) {
   return TlsClient(*TrustingContext(TestPki::Get().root), server.Port()).Message();
 }
 
-TEST(SSLContext, SpeaksTls12And13) {
+TEST(SSLContextTest, SupportsTls12AndTls13) {
   for (const int version : {TLS1_2_VERSION, TLS1_3_VERSION}) {
     TlsPeerOptions peer;
     peer.minVersion = peer.maxVersion = version;
@@ -35,7 +32,7 @@ TEST(SSLContext, SpeaksTls12And13) {
   }
 }
 
-TEST(SSLContext, RefusesAPeerOfAnOlderProtocol) {
+TEST(SSLContextTest, RefusesAPeerOfAnOlderProtocol) {
   TlsPeerOptions peer;
   peer.minVersion = TLS1_VERSION;
   peer.maxVersion = TLS1_1_VERSION;
@@ -50,7 +47,7 @@ struct CipherCase {
   const char* message;
 };
 
-TEST(SSLContext, OffersNoWeakSuites) {
+TEST(SSLContextTest, OffersNoWeakSuites) {
   const char* const refusal =
       "TLS handshake with sts.example failed: sslv3 alert handshake failure";
   for (const CipherCase& suite : {CipherCase{"aNULL", refusal}, CipherCase{"eNULL", refusal},
@@ -63,8 +60,9 @@ TEST(SSLContext, OffersNoWeakSuites) {
   }
 }
 
-// NIST SP 800-57, part 1, section 5.6.1: 1024 bits are worth 80, and 112 are asked for.
-TEST(SSLContext, RefusesAPeerWithAShortKey) {
+// NIST SP 800-57 part 1, section 5.6.1: RSA with 1024 bits has a strength of 80 bits; 112 are
+// required.
+TEST(SSLContextTest, RefusesAPeerWithAShortKey) {
   for (const auto& [bits, message] :
        {std::pair{1024U,
                   "TLS handshake with sts.example failed: EE certificate key too weak "
@@ -81,9 +79,9 @@ TEST(SSLContext, RefusesAPeerWithAShortKey) {
   }
 }
 
-class SSLContextResumption : public testing::TestWithParam<int> {
+class SSLContextResumptionTest : public testing::TestWithParam<int> {
  protected:
-  SSLContextResumption() {
+  SSLContextResumptionTest() {
     IdentityOptions options;
     options.dnsNames = {"sts.example", "other.example"};
     options.addresses = {"127.0.0.1"};
@@ -97,7 +95,7 @@ class SSLContextResumption : public testing::TestWithParam<int> {
     const TlsClient client(context, port, host, serverName);
     ASSERT_EQ(client.Message(), "");
     std::string error;
-    EXPECT_EQ(Testing::ReadAll(client.Stream(), 100, &error), "hello");
+    EXPECT_EQ(ReadAll(client.Stream(), 100, &error), "hello");
     EXPECT_EQ(error, "");
   }
 
@@ -105,7 +103,7 @@ class SSLContextResumption : public testing::TestWithParam<int> {
   TlsPeerOptions peer_;
 };
 
-TEST_P(SSLContextResumption, ResumesTowardsTheSamePeer) {
+TEST_P(SSLContextResumptionTest, ResumesASessionWithTheSamePeer) {
   TlsServer server(peer_, 3);
   const auto context = TrustingContext(TestPki::Get().root);
   Exchange(*context, server.Port(), "sts.example");
@@ -116,7 +114,7 @@ TEST_P(SSLContextResumption, ResumesTowardsTheSamePeer) {
   EXPECT_TRUE(server.Join()[2].resumed);
 }
 
-TEST_P(SSLContextResumption, DoesNotResumeTowardsAnother) {
+TEST_P(SSLContextResumptionTest, DoesNotResumeASessionWithAnotherPeer) {
   TlsServer server(peer_, 4);
   const auto context = TrustingContext(TestPki::Get().root);
   Exchange(*context, server.Port(), "sts.example");
@@ -128,30 +126,30 @@ TEST_P(SSLContextResumption, DoesNotResumeTowardsAnother) {
   }
 }
 
-TEST_P(SSLContextResumption, DoesNotResumeFromAnotherContext) {
+TEST_P(SSLContextResumptionTest, DoesNotResumeASessionOfAnotherContext) {
   TlsServer server(peer_, 2);
   Exchange(*TrustingContext(TestPki::Get().root), server.Port(), "sts.example");
   Exchange(*TrustingContext(TestPki::Get().root), server.Port(), "sts.example");
   EXPECT_FALSE(server.Join()[1].resumed);
 }
 
-TEST_P(SSLContextResumption, KeepsNoSessionOfAPeerThatItRefuses) {
+TEST_P(SSLContextResumptionTest, KeepsNoSessionOfAPeerThatItRefuses) {
   TlsServer server(peer_, 2);
-  const auto context = TrustingContext(Testing::MakeCa("Stranger"));
+  const auto context = TrustingContext(MakeCa("Stranger"));
   for (int i = 0; i < 2; ++i) {
     EXPECT_NE(TlsClient(*context, server.Port()).Message(), "");
   }
   EXPECT_FALSE(server.Join()[1].resumed);
 }
 
-INSTANTIATE_TEST_SUITE_P(Versions, SSLContextResumption,
-                         testing::Values(TLS1_2_VERSION, TLS1_3_VERSION), Testing::NameOfVersion);
+INSTANTIATE_TEST_SUITE_P(Versions, SSLContextResumptionTest,
+                         testing::Values(TLS1_2_VERSION, TLS1_3_VERSION), NameOfVersion);
 
-TEST(SSLContext, RefusesToWrapNothing) {
+TEST(SSLContextTest, RefusesToWrapANullStream) {
   const auto context = CreateSSLContext({});
   EXPECT_THROW(context->WrapStream(nullptr, ""), InvalidArgumentException);
   EXPECT_EQ(context->ToString(), "<SSLContext>");
 }
 
 }  // namespace
-}  // namespace Tarnik::Ssl
+}  // namespace Tarnik::Testing

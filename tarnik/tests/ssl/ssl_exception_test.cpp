@@ -1,11 +1,14 @@
 #include <tarnik/ssl/ssl_exception.h>
 
 #include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
 
-namespace Tarnik::Ssl {
+namespace Tarnik::Testing {
 namespace {
 
-TEST(SSLException, KeepsItsClassWhenClonedAndThrown) {
+using namespace Tarnik::Ssl;
+
+TEST(SSLExceptionTest, KeepsItsClassWhenClonedAndThrown) {
   const SSLException error("what happened");
   const auto clone = error.Clone();
   EXPECT_EQ(clone->Message(), "what happened");
@@ -15,4 +18,4 @@ TEST(SSLException, KeepsItsClassWhenClonedAndThrown) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Ssl
+}  // namespace Tarnik::Testing

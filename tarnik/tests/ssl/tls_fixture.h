@@ -2,19 +2,20 @@
 #define TARNIK_TESTS_SSL_TLS_FIXTURE_H
 
 #include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
 #include <tarnik/ssl/ssl_context.h>
-#include <tarnik/ssl/ssl_exception.h>
 #include <tarnik/system/tcp_client_socket.h>
+#include <tarnik/system/thread_pool.h>
 
 #include <string>
 
+#include "support/openssl.h"
 #include "support/outcome.h"
 #include "support/test_pki.h"
-#include "support/tls_peer.h"
 
 namespace Tarnik::Testing {
 
-/// The certificates that most tests share; made once, since keys take time.
+/// The certificates that most tests share; created once, since generating keys takes time.
 struct TestPki {
   Identity root = MakeCa("Root");
   Identity intermediate = MakeCa("Intermediate", &root);
@@ -26,15 +27,19 @@ struct TestPki {
   }
 };
 
-/// For tests whose parameter is a version of TLS.
+/// Names the parameter of tests that run for several versions of TLS.
 inline std::string NameOfVersion(const testing::TestParamInfo<int>& version) {
   return version.param == TLS1_2_VERSION ? "Tls12" : "Tls13";
 }
 
-inline Ref<Ssl::SSLContext> TrustingContext(const Identity& ca) {
+inline Ssl::SSLContextConfig TrustingConfig(const Identity& ca) {
   Ssl::SSLContextConfig config;
   config.caCertificates = {ca.ToCertificate()};
-  return Ssl::CreateSSLContext(config);
+  return config;
+}
+
+inline Ref<Ssl::SSLContext> TrustingContext(const Identity& ca) {
+  return Ssl::CreateSSLContext(TrustingConfig(ca));
 }
 
 /// A TLS stream over TCP to a port of the loopback interface; closed with its owner.

@@ -3,25 +3,26 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/ssl/ssl_exception.h>
 #include <unistd.h>
 
 #include <cstdio>
+#include <cstdlib>
+#include <memory>
 #include <string>
 #include <vector>
 
 #include "ssl/tls_fixture.h"
+#include "support/test_pki.h"
+#include "support/thrown_message.h"
+#include "support/tls_peer.h"
 
-namespace Tarnik::Ssl {
+namespace Tarnik::Testing {
 namespace {
 
-using Testing::Identity;
-using Testing::MakeCrl;
-using Testing::MakeIdentity;
-using Testing::TemporaryFile;
-using Testing::TestPki;
-using Testing::TlsClient;
-using Testing::TlsPeerOptions;
-using Testing::TlsServer;
+using namespace Tarnik::Ssl;
 
 std::string Handshake(const SSLContextConfig& config, const TlsPeerOptions& peer) {
   TlsServer server(peer, 1);
@@ -35,59 +36,50 @@ TlsPeerOptions LeafPeer() {
 }
 
 std::string MessageOf(const SSLContextConfig& config) {
-  try {
-    CreateSSLContext(config);
-  } catch (const SSLException& e) {
-    return e.Message();
-  }
-  return "";
+  return ThrownMessage<SSLException>([&config] { CreateSSLContext(config); }, "");
 }
 
-TEST(TrustStore, TrustsNobodyByDefault) {
+TEST(TrustStoreTest, TrustsNoPeerByDefault) {
   EXPECT_EQ(Handshake({}, LeafPeer()),
             "TLS handshake with sts.example failed: unable to get local issuer certificate "
             "(CN=sts.example, issued by CN=Root)");
 }
 
-TEST(TrustStore, RefusesASelfSignedPeer) {
+TEST(TrustStoreTest, RefusesASelfSignedPeer) {
   const Identity selfSigned = MakeIdentity({}, nullptr);
   TlsPeerOptions peer;
   peer.identity = &selfSigned;
-  SSLContextConfig config;
-  config.caCertificates = {TestPki::Get().root.ToCertificate()};
+  const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   EXPECT_EQ(Handshake(config, peer),
             "TLS handshake with sts.example failed: self-signed certificate (CN=sts.example)");
 }
 
-TEST(TrustStore, TrustsNoRootThatThePeerBringsAlong) {
-  const Identity stranger = Testing::MakeCa("Stranger");
+TEST(TrustStoreTest, DoesNotTrustARootSentByThePeer) {
+  const Identity stranger = MakeCa("Stranger");
   const Identity leaf = MakeIdentity({}, &stranger);
   TlsPeerOptions peer;
   peer.identity = &leaf;
   peer.chain = {&stranger};
-  SSLContextConfig config;
-  config.caCertificates = {TestPki::Get().root.ToCertificate()};
+  const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   EXPECT_EQ(Handshake(config, peer),
             "TLS handshake with sts.example failed: self-signed certificate in certificate chain "
             "(CN=Stranger)");
 }
 
-TEST(TrustStore, RefusesAForgedRootOfTheSameName) {
-  const Identity forged = Testing::MakeCa("Root");
+TEST(TrustStoreTest, RefusesAForgedRootOfTheSameName) {
+  const Identity forged = MakeCa("Root");
   const Identity leaf = MakeIdentity({}, &forged);
   TlsPeerOptions peer;
   peer.identity = &leaf;
-  SSLContextConfig config;
-  config.caCertificates = {TestPki::Get().root.ToCertificate()};
+  const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   EXPECT_NE(Handshake(config, peer), "");
 }
 
-TEST(TrustStore, NeedsTheIntermediateFromThePeer) {
+TEST(TrustStoreTest, NeedsTheIntermediateCertificateFromThePeer) {
   const Identity leaf = MakeIdentity({}, &TestPki::Get().intermediate);
   TlsPeerOptions peer;
   peer.identity = &leaf;
-  SSLContextConfig config;
-  config.caCertificates = {TestPki::Get().root.ToCertificate()};
+  const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   EXPECT_EQ(Handshake(config, peer),
             "TLS handshake with sts.example failed: unable to get local issuer certificate "
             "(CN=sts.example, issued by CN=Intermediate)");
@@ -95,26 +87,25 @@ TEST(TrustStore, NeedsTheIntermediateFromThePeer) {
   EXPECT_EQ(Handshake(config, peer), "");
 }
 
-TEST(TrustStore, RefusesALeafAsIssuer) {
+TEST(TrustStoreTest, RefusesALeafAsIssuer) {
   const Identity leaf = MakeIdentity({}, &TestPki::Get().leaf);
   TlsPeerOptions peer;
   peer.identity = &leaf;
   peer.chain = {&TestPki::Get().leaf};
-  SSLContextConfig config;
-  config.caCertificates = {TestPki::Get().root.ToCertificate()};
+  const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   EXPECT_THAT(Handshake(config, peer),
               testing::StartsWith("TLS handshake with sts.example failed: invalid CA certificate"));
 }
 
-TEST(TrustStore, LoadsCaFiles) {
-  const TemporaryFile other(Testing::MakeCa("Other").Pem());
-  const TemporaryFile both(Testing::MakeCa("Third").Pem() + TestPki::Get().root.Pem());
+TEST(TrustStoreTest, LoadsCaFiles) {
+  const TemporaryFile other(MakeCa("Other").Pem());
+  const TemporaryFile both(MakeCa("Third").Pem() + TestPki::Get().root.Pem());
   SSLContextConfig config;
   config.caFiles = {other.Path(), both.Path()};
   EXPECT_EQ(Handshake(config, LeafPeer()), "");
 }
 
-TEST(TrustStore, LoadsCaFoldersByHash) {
+TEST(TrustStoreTest, LoadsCaFoldersByHash) {
   std::string folder = testing::TempDir() + "tarnik_XXXXXX";
   ASSERT_NE(mkdtemp(folder.data()), nullptr);
   char name[16];
@@ -131,14 +122,14 @@ TEST(TrustStore, LoadsCaFoldersByHash) {
   rmdir(folder.c_str());
 }
 
-TEST(TrustStore, LoadsTheSystemStore) {
+TEST(TrustStoreTest, LoadsTheSystemStore) {
   SSLContextConfig config;
   config.useSystemStore = true;
   EXPECT_EQ(MessageOf(config), "");
   EXPECT_THAT(Handshake(config, LeafPeer()), testing::HasSubstr("unable to get local issuer"));
 }
 
-TEST(TrustStore, NamesWhatItCannotLoad) {
+TEST(TrustStoreTest, NamesWhatItCannotLoad) {
   const TemporaryFile garbage("no certificate\n");
   SSLContextConfig config;
   config.caFiles = {"/nonexistent/ca.pem"};
@@ -167,7 +158,7 @@ TEST(TrustStore, NamesWhatItCannotLoad) {
               testing::StartsWith("Cannot load revocation lists from '" + garbage.Path() + "': "));
 }
 
-TEST(TrustStore, RefusesNullCertificates) {
+TEST(TrustStoreTest, RefusesNullCertificates) {
   SSLContextConfig config;
   config.caCertificates = {nullptr};
   EXPECT_THROW(CreateSSLContext(config), InvalidArgumentException);
@@ -178,8 +169,7 @@ TEST(TrustStore, RefusesNullCertificates) {
 
 std::string HandshakeWithCrls(const std::vector<std::string>& crls, const TlsPeerOptions& peer) {
   std::vector<std::unique_ptr<TemporaryFile>> files;
-  SSLContextConfig config;
-  config.caCertificates = {TestPki::Get().root.ToCertificate()};
+  SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   for (const std::string& crl : crls) {
     files.push_back(std::make_unique<TemporaryFile>(crl));
     config.crlFiles.push_back(files.back()->Path());
@@ -187,7 +177,7 @@ std::string HandshakeWithCrls(const std::vector<std::string>& crls, const TlsPee
   return Handshake(config, peer);
 }
 
-TEST(TrustStore, RefusesARevokedPeer) {
+TEST(TrustStoreTest, RefusesARevokedPeer) {
   const Identity& root = TestPki::Get().root;
   const Identity& leaf = TestPki::Get().leaf;
   EXPECT_EQ(HandshakeWithCrls({MakeCrl(root, nullptr)}, LeafPeer()), "");
@@ -195,8 +185,8 @@ TEST(TrustStore, RefusesARevokedPeer) {
             "TLS handshake with sts.example failed: certificate revoked (CN=sts.example)");
 }
 
-TEST(TrustStore, RefusesAPeerWhoseRevocationListIsMissingOrOld) {
-  const Identity stranger = Testing::MakeCa("Stranger");
+TEST(TrustStoreTest, RefusesAPeerWhoseRevocationListIsMissingOrExpired) {
+  const Identity stranger = MakeCa("Stranger");
   EXPECT_EQ(HandshakeWithCrls({MakeCrl(stranger, nullptr)}, LeafPeer()),
             "TLS handshake with sts.example failed: unable to get certificate CRL "
             "(CN=sts.example)");
@@ -204,7 +194,7 @@ TEST(TrustStore, RefusesAPeerWhoseRevocationListIsMissingOrOld) {
             "TLS handshake with sts.example failed: CRL has expired (CN=sts.example)");
 }
 
-TEST(TrustStore, ChecksTheWholeChainForRevocation) {
+TEST(TrustStoreTest, ChecksTheWholeChainForRevocation) {
   const Identity& root = TestPki::Get().root;
   const Identity& intermediate = TestPki::Get().intermediate;
   const Identity leaf = MakeIdentity({}, &intermediate);
@@ -221,4 +211,4 @@ TEST(TrustStore, ChecksTheWholeChainForRevocation) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Ssl
+}  // namespace Tarnik::Testing

@@ -3,13 +3,13 @@
 
 #include <openssl/pem.h>
 
+#include <cstddef>
 #include <string>
-#include <vector>
 
 #include "support/openssl.h"
 #include "support/test_certificates.h"
 
-namespace Tarnik::Tests {
+namespace Tarnik::Testing {
 
 inline std::string TextOf(BIO* memory) {
   char* text = nullptr;
@@ -29,7 +29,7 @@ inline std::string ToPkcs8Pem(EVP_PKEY* key, const std::string* passphrase = nul
   return TextOf(memory.get());
 }
 
-/// The traditional form of the key's type; encrypted if a passphrase is given.
+/// The traditional form for the type of the key; encrypted if a passphrase is given.
 inline std::string ToTraditionalPem(EVP_PKEY* key, const std::string* passphrase = nullptr) {
   const OpenSsl::OwnedBio memory(BIO_new(BIO_s_mem()));
   const EVP_CIPHER* cipher = passphrase == nullptr ? nullptr : EVP_aes_128_cbc();
@@ -42,6 +42,6 @@ inline std::string ToTraditionalPem(EVP_PKEY* key, const std::string* passphrase
   return TextOf(memory.get());
 }
 
-}  // namespace Tarnik::Tests
+}  // namespace Tarnik::Testing
 
 #endif

@@ -5,8 +5,11 @@
 #include <libxml/xmlerror.h>
 
 #include <memory>
+#include <optional>
+#include <string>
+#include <vector>
 
-namespace Tarnik::TestSupport {
+namespace Tarnik::Testing {
 
 namespace {
 
@@ -54,7 +57,7 @@ xmlNode* ElementAt(xmlDoc* document, int index) {
 }
 
 int IsInSubtree(void* apex, xmlNode* node, xmlNode* parent) {
-  // A namespace node is not linked to its element: the parent tells.
+  // A namespace node has no link to its element, which is passed as the parent.
   xmlNode* up = node->type == XML_NAMESPACE_DECL ? parent : node;
   while (up != nullptr && up != apex) {
     up = up->parent;
@@ -103,4 +106,4 @@ bool IsWellFormedForLibXml2(const std::string& xml) {
   return wellFormed;
 }
 
-}  // namespace Tarnik::TestSupport
+}  // namespace Tarnik::Testing

@@ -5,24 +5,24 @@
 #include <string>
 #include <vector>
 
-namespace Tarnik::TestSupport {
+namespace Tarnik::Testing {
 
 struct OracleRequest {
   bool exclusive = false;
   bool withComments = false;
   std::vector<std::string> inclusivePrefixes;
-  /// The element to canonicalise with all below it, counted from 0 in document order; none for the
+  /// The element whose subtree is canonicalised, counted from 0 in document order; none for the
   /// whole document.
   std::optional<int> element;
 };
 
-/// The canonical form of `xml` as libxml2 gives it; none when it refuses.
+/// The canonical form of `xml` by libxml2, or none if libxml2 refuses it.
 std::optional<std::string> CanonicalizeWithLibXml2(const std::string& xml,
                                                    const OracleRequest& request);
 
-/// True when libxml2 finds `xml` well-formed and right in its namespaces.
+/// True if libxml2 finds `xml` well-formed and namespace-well-formed.
 bool IsWellFormedForLibXml2(const std::string& xml);
 
-}  // namespace Tarnik::TestSupport
+}  // namespace Tarnik::Testing
 
 #endif

@@ -5,9 +5,12 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
-#include <algorithm>
+#include <cerrno>
+#include <cstddef>
 #include <cstring>
 #include <stdexcept>
+#include <string>
+#include <utility>
 
 namespace Tarnik::Testing {
 namespace {

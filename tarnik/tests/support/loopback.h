@@ -23,7 +23,7 @@ class Descriptor {
   int value_;
 };
 
-/// A TCP port on the loopback interface that was not in use.
+/// Listens on an unused TCP port of the loopback interface.
 class LoopbackListener {
  public:
   /// Listens on 127.0.0.1, or on ::1 if `ipv6`.
@@ -41,13 +41,14 @@ class LoopbackListener {
 };
 
 bool HasIpv6Loopback();
-/// Blocking; false when the peer has gone.
+/// Blocks until all is sent; returns false if the peer has gone.
 bool SendAll(int socket, const std::string& data);
-/// Up to `size` bytes, fewer only at the end of the stream or after a reset.
+/// Blocks for `size` bytes; returns fewer only at the end of the stream or after a reset.
 std::string ReceiveExactly(int socket, std::size_t size);
-/// The next `Close` of `socket` resets the connection instead of ending it in order.
+/// Makes the next close of `socket` reset the connection instead of ending it in order.
 void ResetOnClose(int socket);
-/// The loopback port of a socket that was bound but does not listen: connecting to it is refused.
+/// The loopback port of a socket that is bound but does not listen, so that connecting to it is
+/// refused. `holder` owns the socket.
 int RefusingPort(Descriptor& holder);
 
 }  // namespace Tarnik::Testing

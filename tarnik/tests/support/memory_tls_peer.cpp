@@ -1,10 +1,14 @@
 #include "support/memory_tls_peer.h"
 
 #include <openssl/err.h>
+#include <tarnik/core/exception.h>
 #include <tarnik/system/thread_pool.h>
 
 #include <algorithm>
+#include <cstddef>
 #include <cstring>
+#include <functional>
+#include <mutex>
 #include <utility>
 
 namespace Tarnik::Testing {

@@ -5,6 +5,7 @@
 #include <tarnik/system/stream.h>
 
 #include <cstddef>
+#include <functional>
 #include <limits>
 #include <mutex>
 #include <string>
@@ -13,8 +14,8 @@
 
 namespace Tarnik::Testing {
 
-/// A stream whose other end is a TLS server in memory, which says `greeting` after the handshake
-/// and closes in order. What it sends can be cut off after any number of bytes, and comes in
+/// A stream whose other end is a TLS server in memory, which sends `greeting` after the handshake
+/// and closes in order. What it sends can be cut off after any number of bytes and arrives in
 /// pieces of a chosen size.
 class MemoryTlsPeer final : public System::Stream, public ObjectImpl {
  public:
@@ -34,7 +35,7 @@ class MemoryTlsPeer final : public System::Stream, public ObjectImpl {
   void WriteAsync(const char* data, std::size_t size, WriteCompletion completion) override;
   void Close() noexcept override;
 
-  /// How many bytes the peer has had to send so far, cut off or not.
+  /// How many bytes the peer has produced so far, whether they are cut off or not.
   std::size_t BytesMade() const;
   std::size_t Writes() const;
   bool IsClosed() const;

@@ -7,6 +7,7 @@
 
 #include <chrono>
 #include <condition_variable>
+#include <cstddef>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -16,8 +17,9 @@ namespace Tarnik::Testing {
 
 constexpr std::chrono::seconds kPatience{30};
 
-/// Collects what a completion reports, and on which thread. Shared with the completions, so that
-/// one which comes too often or too late is seen instead of crashing the test.
+/// Records what a completion reports, and on which thread. The state is shared with the
+/// completions, so that a completion that runs too often or too late is detected and does not crash
+/// the test.
 class Outcome {
  public:
   Outcome() : state_(std::make_shared<State>()) {}
@@ -40,7 +42,7 @@ class Outcome {
     return [self = *this](std::size_t bytes, Exception* error) { self.Report(error, bytes); };
   }
 
-  /// False when nothing was reported in time.
+  /// Returns false if nothing is reported in time.
   [[nodiscard]] bool Wait(std::chrono::milliseconds limit = kPatience) const {
     std::unique_lock lock(state_->mutex);
     return state_->reported.wait_for(lock, limit, [this] { return state_->count > 0; });

@@ -6,9 +6,9 @@
 #include <string>
 #include <vector>
 
-namespace Tarnik::TestSupport {
+namespace Tarnik::Testing {
 
-/// Makes well-formed documents full of what canonical XML has rules for.
+/// Generates well-formed documents that exercise the rules of Canonical XML.
 class RandomXml {
  public:
   explicit RandomXml(unsigned seed) : random_(seed) {}
@@ -26,7 +26,7 @@ class RandomXml {
   int Elements() const { return elements_; }
 
   int Below(int limit) { return std::uniform_int_distribution<int>(0, limit - 1)(random_); }
-  /// True once in `n` times.
+  /// True in one of `n` cases on average.
   bool Chance(int n) { return Below(n) == 0; }
 
   template <class T>
@@ -91,8 +91,8 @@ class RandomXml {
     return Pick(kValues);
   }
 
-  // No markup characters: libxml2 writes these in namespace names without escaping them, so that it
-  // is no judge there.
+  // No markup characters: libxml2 does not escape them in namespace names, so its output cannot be
+  // compared there.
   std::string Uri() {
     static const std::vector<std::string> kUris = {
         "urn:a", "urn:b",        "http://x.example/",  "http://x.example/?q=1",
@@ -186,6 +186,6 @@ class RandomXml {
   int elements_ = 0;
 };
 
-}  // namespace Tarnik::TestSupport
+}  // namespace Tarnik::Testing
 
 #endif

@@ -1,17 +1,27 @@
 #include "support/scripted_spec.h"
 
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
 #include <tarnik/ssl/ssl_context.h>
+#include <tarnik/system/cancellable_item.h>
+#include <tarnik/system/stream.h>
 #include <tarnik/system/thread_pool.h>
 
+#include <cstddef>
+#include <mutex>
+#include <string>
 #include <utility>
+#include <vector>
+
+#include "support/scripted_stream.h"
 
 namespace Tarnik::Testing {
 namespace {
 
-/// Presents a stream as one of TLS.
-class TlsGuise final : public Ssl::SSLStream, public ObjectImpl {
+/// Presents a stream as a TLS stream.
+class PretendedTlsStream final : public Ssl::SSLStream, public ObjectImpl {
  public:
-  explicit TlsGuise(Ref<System::Stream> stream) : stream_(std::move(stream)) {}
+  explicit PretendedTlsStream(Ref<System::Stream> stream) : stream_(std::move(stream)) {}
 
   void HandshakeClientAsync(const std::string&, const std::string&, HandshakeCompletion) override {
     throw InvalidStateException("The handshake is over.");
@@ -25,7 +35,7 @@ class TlsGuise final : public Ssl::SSLStream, public ObjectImpl {
   void Close() noexcept override { stream_->Close(); }
 
  private:
-  ~TlsGuise() override = default;
+  ~PretendedTlsStream() override = default;
 
   const Ref<System::Stream> stream_;
 };
@@ -68,11 +78,11 @@ Ref<System::CancellableItem> ScriptedSpec::StartConnect(ConnectCompletion comple
 void ScriptedSpec::Complete(const ConnectCompletion& completion) {
   if (!script_.connectError.empty()) {
     IOException error(script_.connectError);
-    // As a TLS handshake that has failed, which leaves its stream behind.
+    // Like a TLS handshake that has failed, which still passes its stream.
     completion(MakeRef<ScriptedStream>(script_.stream).get(), &error);
     return;
   }
-  if (script_.givesNoStream) {
+  if (script_.omitsStream) {
     completion(nullptr, nullptr);
     return;
   }
@@ -83,7 +93,7 @@ void ScriptedSpec::Complete(const ConnectCompletion& completion) {
   }
   Ref<System::Stream> presented = stream;
   if (script_.isTls) {
-    presented = MakeRef<TlsGuise>(stream);
+    presented = MakeRef<PretendedTlsStream>(stream);
   }
   completion(presented.get(), nullptr);
 }

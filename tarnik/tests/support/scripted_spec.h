@@ -4,10 +4,12 @@
 #include <tarnik/core/object_impl.h>
 #include <tarnik/http/connection_spec.h>
 
+#include <cstddef>
 #include <functional>
 #include <memory>
 #include <mutex>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "support/scripted_stream.h"
@@ -22,20 +24,20 @@ class ScriptedSpec final : public Http::CustomConnectionSpec, public ObjectImpl 
     std::string cookieHost = "sts.example";
     std::string endpointKey = "sts.example:443";
     bool isProxy = false;
-    /// Streams are presented as TLS.
+    /// Presents streams as TLS streams.
     bool isTls = false;
-    /// Every stream's script.
+    /// The script of every stream.
     ScriptedStream::Script stream;
-    /// Not empty: connecting fails with an `IOException` that says so.
+    /// If not empty, connecting fails with an `IOException` with this message.
     std::string connectError = {};
-    /// Not empty: starting to connect throws an `InvalidArgumentException` that says so.
+    /// If not empty, starting to connect throws an `InvalidArgumentException` with this message.
     std::string startError = {};
-    /// Connecting ends with a `CancelledException`, by the item, or not at all.
+    /// Connecting waits until its item is cancelled or `ReleaseConnect` is called.
     bool holdConnects = false;
-    /// Runs before the start of a connect returns, whose completion may run meanwhile.
+    /// Runs before the start of a connect returns; the completion may run meanwhile.
     std::function<void()> beforeStartReturns = {};
-    /// Connecting succeeds without giving a stream.
-    bool givesNoStream = false;
+    /// Connecting succeeds without a stream.
+    bool omitsStream = false;
   };
 
   explicit ScriptedSpec(Script script) : script_(std::move(script)) {}
@@ -46,13 +48,13 @@ class ScriptedSpec final : public Http::CustomConnectionSpec, public ObjectImpl 
   bool IsProxy() const override { return script_.isProxy; }
   Ref<System::CancellableItem> StartConnect(ConnectCompletion completion) override;
 
-  /// The streams opened so far. A test that asks for them keeps them alive.
+  /// The streams opened so far. The result keeps them alive.
   std::vector<Ref<ScriptedStream>> Streams() const;
   std::size_t ConnectCount() const;
   std::size_t CancelCount() const;
-  /// Lets the streams go.
+  /// Drops the references to the streams.
   void ForgetStreams();
-  /// Completes a connect that the script holds, with a stream.
+  /// Completes a held connect with a stream.
   void ReleaseConnect();
 
  private:

@@ -1,9 +1,14 @@
 #include "support/scripted_stream.h"
 
+#include <tarnik/core/exception.h>
 #include <tarnik/system/thread_pool.h>
 
 #include <algorithm>
 #include <atomic>
+#include <cstddef>
+#include <memory>
+#include <mutex>
+#include <string>
 #include <utility>
 
 namespace Tarnik::Testing {

@@ -5,6 +5,7 @@
 #include <tarnik/core/ref.h>
 #include <tarnik/system/stream.h>
 
+#include <cstddef>
 #include <functional>
 #include <limits>
 #include <memory>
@@ -13,43 +14,44 @@
 
 namespace Tarnik::Testing {
 
-/// A stream in memory whose other end is the test: it sees what was written and decides what is
-/// read, byte for byte, and when. Completions run on the pool's I/O threads, as a real stream's.
+/// A stream in memory whose other end is the test: it inspects what was written and decides what is
+/// read and when, byte for byte. Completions run on the I/O threads of the pool, as those of a real
+/// stream do.
 class ScriptedStream final : public System::Stream, public ObjectImpl {
  public:
-  /// Runs after each write, on the thread of its completion and before it.
+  /// Runs after each write, on the thread of its completion and before the completion.
   using WriteHook = std::function<void(ScriptedStream& stream)>;
 
   struct Script {
     WriteHook onWritten;
-    /// The most bytes that one read delivers.
+    /// The maximum number of bytes that one read delivers.
     std::size_t pieceSize = std::numeric_limits<std::size_t>::max();
-    /// A write fails once this many bytes have been taken.
+    /// A write fails once this many bytes have been accepted.
     std::size_t failWriteAt = std::numeric_limits<std::size_t>::max();
-    /// Writes never complete but by `Close`.
+    /// Writes complete only by `ReleaseWrite` or `Close`.
     bool holdWrites = false;
   };
 
   explicit ScriptedStream(Script script);
 
-  /// Lets the reader have `bytes`, then the end, then an error that says `message`.
+  /// What the reader receives next: bytes, the end of the stream, or an error with `message`.
   void Push(const std::string& bytes);
   void PushEnd();
   void PushError(const std::string& message);
 
-  /// All that has been written.
+  /// Everything that has been written.
   std::string Written() const;
   bool IsClosed() const;
-  /// True when a read waits for bytes.
+  /// True if a read waits for bytes.
   bool IsRead() const;
-  /// Completes a write that the script holds.
+  /// Completes a held write.
   void ReleaseWrite();
 
   void ReadAsync(char* buffer, std::size_t size, ReadCompletion completion) override;
   void WriteAsync(const char* data, std::size_t size, WriteCompletion completion) override;
   void Close() noexcept override;
 
-  /// How many of these streams live.
+  /// The number of these streams that exist.
   static int LiveCount() noexcept;
 
  private:
@@ -61,7 +63,7 @@ class ScriptedStream final : public System::Stream, public ObjectImpl {
 
   ~ScriptedStream() override;
 
-  /// Completes the read under way if there is something for it. Called with the lock held.
+  /// Completes the pending read if there is something for it. The caller holds the lock.
   void Serve();
   void CompleteRead(std::size_t size, std::shared_ptr<Exception> error);
   void CompleteWrite(WriteCompletion completion, std::shared_ptr<Exception> error, bool runsHook);

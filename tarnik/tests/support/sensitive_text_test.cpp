@@ -1,9 +1,14 @@
 #include "support/sensitive_text.h"
 
-namespace Tarnik {
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <string>
+
+namespace Tarnik::Testing {
 namespace {
 
-TEST(SensitiveText, KeepsItsBytesWhenItGrows) {
+TEST(SensitiveTextTest, KeepsItsBytesWhenItGrows) {
   SensitiveText text;
   std::string expected;
   for (int i = 0; i < 10000; ++i) {
@@ -14,7 +19,7 @@ TEST(SensitiveText, KeepsItsBytesWhenItGrows) {
   EXPECT_EQ(text.Text(), expected);
 }
 
-TEST(SensitiveText, DropsAPrefix) {
+TEST(SensitiveTextTest, DropsAPrefix) {
   SensitiveText text;
   text.Append("abcdef");
   text.RemovePrefix(0);
@@ -25,20 +30,20 @@ TEST(SensitiveText, DropsAPrefix) {
   EXPECT_EQ(text.Text(), "");
 }
 
-TEST(SensitiveText, OverwritesItsBytesWhenItIsCleared) {
+TEST(SensitiveTextTest, OverwritesItsBytesWhenItIsCleared) {
   SensitiveText text;
   text.Append("a password that is too long to live inside the string object");
   const char* const bytes = text.Text().data();
   const std::size_t size = text.Size();
   text.Clear();
-  // A cleared string keeps its memory, so these bytes may still be looked at.
+  // A cleared string keeps its memory, so these bytes may still be read.
   ASSERT_EQ(text.Text().data(), bytes);
   ASSERT_GE(text.Text().capacity(), size);
   text.Append(std::string(1, 'x'));
   EXPECT_EQ(std::string(bytes + 2, size - 2).find_first_not_of('\0'), std::string::npos);
 }
 
-TEST(SensitiveText, HandsItsBytesOverAndIsEmpty) {
+TEST(SensitiveTextTest, IsEmptyAfterItsBytesAreTaken) {
   SensitiveText text;
   text.Append("token");
   EXPECT_EQ(text.Take(), "token");
@@ -46,4 +51,4 @@ TEST(SensitiveText, HandsItsBytesOverAndIsEmpty) {
 }
 
 }  // namespace
-}  // namespace Tarnik
+}  // namespace Tarnik::Testing

@@ -4,18 +4,17 @@
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
 #include <openssl/pem.h>
-
-#include <tarnik/core/checked_cast.h>
-#include <tarnik/core/reader.h>
 #include <tarnik/core/writer.h>
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/text/string_util.h>
 #include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
 #include <tarnik/xml/security/canonicalizer.h>
 #include <tarnik/xml/security/key_info_resolver.h>
 #include <tarnik/xml/security/signature.h>
 #include <tarnik/xml/security/xml_security_exception.h>
-#include <tarnik/xml/xml_parser.h>
+
+#include <cstddef>
 #include <fstream>
 #include <initializer_list>
 #include <iterator>
@@ -24,20 +23,14 @@
 #include <string_view>
 #include <vector>
 
+#include "support/algorithm_uris.h"
 #include "support/openssl.h"
+#include "support/test_certificates.h"
+#include "support/xml_text.h"
 
-namespace Tarnik::Tests {
+namespace Tarnik::Testing {
 
-inline constexpr std::string_view kDs = "http://www.w3.org/2000/09/xmldsig#";
-
-inline Ref<Xml::Document> ParseDocument(std::string_view xml) {
-  const auto reader = CreateStringReader(std::string(xml));
-  const auto handler = Xml::CreateXMLDocumentHandler();
-  const Ref<Object> parsed = Xml::CreateXMLParser(reader.get(), handler.get())->Parse();
-  return Ref<Xml::Document>(CheckedCast<Xml::Document>(parsed.get()));
-}
-
-/// The first element of this name in document order, whatever its namespace, or null.
+/// The first element with this name in document order in any namespace, or null.
 inline Xml::ElementNode* FindElement(const Xml::ParentNode* parent, std::string_view localName) {
   for (Xml::Node* node = parent->FirstChild(); node != nullptr; node = node->NextSibling()) {
     if (node->Kind() != Xml::NodeKind::kElement) {
@@ -54,7 +47,7 @@ inline Xml::ElementNode* FindElement(const Xml::ParentNode* parent, std::string_
   return nullptr;
 }
 
-/// Keys of a signer, made once in the process for each type and name.
+/// The credential of a signer; created once per process for each type and name.
 inline DevSts::Credential SignerOf(DevSts::KeyType type, const char* name = "signer") {
   DevSts::CertificateSpec spec;
   spec.commonName = name;
@@ -80,10 +73,10 @@ inline Ref<const Xml::Security::KeyInfoResolver> Trusting(const DevSts::Credenti
   return Xml::Security::CreateTrustedCertificatesResolver({CertificateOf(credential)});
 }
 
-/// What becomes of the first signature of a document: "valid", "invalid", or the class and message
+/// The verdict on the first signature of a document: "valid", "invalid", or the class and message
 /// of the exception.
-inline std::string Judge(std::string_view xml, const Xml::Security::KeyInfoResolver* resolver) {
-  const Ref<Xml::Document> document = ParseDocument(xml);
+inline std::string Verdict(std::string_view xml, const Xml::Security::KeyInfoResolver* resolver) {
+  const Ref<Xml::Document> document = ParseXml(xml);
   Ref<Xml::Security::Signature> signature;
   try {
     signature = Xml::Security::CreateSignatureFromDom(FindElement(document.get(), "Signature"));
@@ -97,11 +90,11 @@ inline std::string Judge(std::string_view xml, const Xml::Security::KeyInfoResol
   }
 }
 
-inline std::string Judge(std::string_view xml, const DevSts::Credential& trusted = Signer()) {
-  return Judge(xml, Trusting(trusted).get());
+inline std::string Verdict(std::string_view xml, const DevSts::Credential& trusted = Signer()) {
+  return Verdict(xml, Trusting(trusted).get());
 }
 
-/// `text` with the one place where `from` stands replaced.
+/// `text` with the first occurrence of `from` replaced.
 inline std::string Replaced(std::string text, std::string_view from, std::string_view to) {
   const std::size_t place = text.find(from);
   if (place == std::string::npos) {
@@ -110,7 +103,7 @@ inline std::string Replaced(std::string text, std::string_view from, std::string
   return text.replace(place, from.size(), to);
 }
 
-/// `text` with all that stands between `begin` and `end` replaced.
+/// `text` with everything between `begin` and `end` replaced.
 inline std::string ReplacedBetween(std::string text, std::string_view begin, std::string_view end,
                                    std::string_view to) {
   const std::size_t start = text.find(begin);
@@ -127,7 +120,7 @@ inline std::string Between(const std::string& text, std::string_view begin, std:
   return text.substr(start, text.find(end, start) - start);
 }
 
-/// A document with content that canonicalisation must get right.
+/// A document with content that canonicalisation must handle.
 inline constexpr std::string_view kUnsigned =
     "<saml:Assertion xmlns:saml=\"urn:oasis:names:tc:SAML:2.0:assertion\" ID=\"_a1\" "
     "xmlns:unused=\"urn:unused\" xml:lang=\"en\">\n"
@@ -150,12 +143,12 @@ inline std::string ReadTestData(const std::string& name) {
   return {std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
 }
 
-/// The document with its signature value made anew by RSA-SHA256 over the SignedInfo that stands
-/// there, so that nothing but a digest or a rule can be wrong.
+/// The document with a new signature value by RSA-SHA256 over its SignedInfo, so that only a digest
+/// or a rule can be wrong.
 inline std::string Resigned(const std::string& xml, const DevSts::Credential& signer = Signer()) {
-  const Ref<Xml::Document> document = ParseDocument(xml);
+  const Ref<Xml::Document> document = ParseXml(xml);
   const Ref<StringWriter> writer = CreateStringWriter();
-  Xml::Security::CreateCanonicalizer("http://www.w3.org/2001/10/xml-exc-c14n#")
+  Xml::Security::CreateCanonicalizer(kExclusive)
       ->Canonicalize(FindElement(document.get(), "SignedInfo"), writer.get());
   const std::string& pem = signer.privateKeyPem;
   const OpenSsl::OwnedBio source(BIO_new_mem_buf(pem.data(), static_cast<int>(pem.size())));
@@ -173,7 +166,7 @@ inline std::string Resigned(const std::string& xml, const DevSts::Credential& si
                          StringUtil::Base64Encode(value));
 }
 
-/// The pieces of a signature template; every piece may be replaced.
+/// The parts of a signature template; every part may be replaced.
 struct SignatureTemplate {
   std::string canonicalization = "http://www.w3.org/2001/10/xml-exc-c14n#";
   std::string signatureMethod = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
@@ -197,13 +190,13 @@ struct SignatureTemplate {
   }
 };
 
-/// An assertion around a signature template, to be signed or judged as it is.
+/// An assertion around a signature template, to be signed or verified as it is.
 inline std::string AssertionWith(const std::string& signature, const std::string& more = "") {
   return "<Assertion ID=\"_a1\"><Issuer>sts</Issuer>" + signature +
          "<Subject>user@example</Subject>" + more + "</Assertion>";
 }
 
-/// As above, with values that look like values.
+/// As above, with values that are well-formed.
 inline std::string AssertionWithValues(const SignatureTemplate& signature) {
   std::string text = AssertionWith(signature.Text());
   for (const std::string_view empty :
@@ -227,6 +220,6 @@ inline std::string Transforms(std::initializer_list<std::string_view> algorithms
   return text + "</ds:Transforms>";
 }
 
-}  // namespace Tarnik::Tests
+}  // namespace Tarnik::Testing
 
 #endif

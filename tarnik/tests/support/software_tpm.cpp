@@ -17,6 +17,7 @@
 #include <filesystem>
 #include <memory>
 #include <stdexcept>
+#include <string>
 #include <thread>
 #include <vector>
 
@@ -66,7 +67,7 @@ class Socket {
   int descriptor_;
 };
 
-/// A port that is free, and the next one, too: clients take that for the control channel.
+/// The first of two free ports in a row: clients use the second for the control channel.
 int FreePortPair() {
   for (int i = 0; i < kAttempts; ++i) {
     const Socket first;
@@ -93,7 +94,7 @@ bool SoftwareTpm::IsInstalled() {
 }
 
 SoftwareTpm::SoftwareTpm() : folder_(MakeFolder()) {
-  // Another process may take the ports in between: then the program ends and others are tried.
+  // Another process may take the ports in between: then the program ends and other ports are tried.
   for (int i = 0; i < kAttempts; ++i) {
     const int port = FreePortPair();
     StartOn(port);

@@ -7,11 +7,11 @@
 
 namespace Tarnik::Testing {
 
-/// A TPM in a process of its own that listens on the loopback interface: a device whose keys never
-/// leave it. It goes with its owner.
+/// A TPM in a separate process that listens on the loopback interface: a device whose keys never
+/// leave it. It ends with its owner.
 class SoftwareTpm {
  public:
-  /// True when the programs that this needs are installed.
+  /// True if the programs that this needs are installed.
   static bool IsInstalled();
 
   SoftwareTpm();
@@ -19,11 +19,11 @@ class SoftwareTpm {
   SoftwareTpm(const SoftwareTpm&) = delete;
   SoftwareTpm& operator=(const SoftwareTpm&) = delete;
 
-  /// Makes a key that asks for `pin` and keeps it under `handle`.
+  /// Creates a key that requires `pin` and stores it under `handle`.
   void MakeKey(const std::string& algorithm, const std::string& attributes, const std::string& pin,
                const std::string& handle) const;
 
-  /// Runs a shell command that finds the TPM; gives what it writes to its standard output.
+  /// Runs a shell command that can use the TPM; returns its standard output.
   std::string Run(const std::string& command) const;
 
  private:

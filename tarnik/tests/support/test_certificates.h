@@ -2,14 +2,15 @@
 #define TARNIK_TESTS_SUPPORT_TEST_CERTIFICATES_H
 
 #include <tarnik/crypto/certificate.h>
+
+#include <cstddef>
 #include <stdexcept>
 #include <string>
-#include <string_view>
 #include <vector>
 
 #include "support/openssl.h"
 
-namespace Tarnik::Tests {
+namespace Tarnik::Testing {
 
 inline void Require(bool condition, const char* what) {
   if (!condition) {
@@ -29,14 +30,14 @@ inline OpenSsl::OwnedKey MakeEcKey(const char* curve) {
   return key;
 }
 
-/// A key of a type without parameters, as "ED25519".
+/// A key of a type without parameters, such as "ED25519".
 inline OpenSsl::OwnedKey MakeKey(const char* type) {
   OpenSsl::OwnedKey key(EVP_PKEY_Q_keygen(nullptr, nullptr, type));
   Require(key != nullptr, "key");
   return key;
 }
 
-/// A key that is made once in the process, since RSA keys are slow to make.
+/// A key that is created once per process, since generating RSA keys is slow.
 inline EVP_PKEY* SharedRsaKey() {
   static const OpenSsl::OwnedKey key = MakeRsaKey(2048);
   return key.get();
@@ -96,6 +97,6 @@ inline Ref<const Crypto::Certificate> MakeCertificate(const CertificateRecipe& r
   return Crypto::CreateCertificateFromDer(der.data(), der.size());
 }
 
-}  // namespace Tarnik::Tests
+}  // namespace Tarnik::Testing
 
 #endif

@@ -3,9 +3,15 @@
 #include <gtest/gtest.h>
 #include <openssl/pem.h>
 #include <openssl/rand.h>
+#include <tarnik/crypto/certificate.h>
 #include <unistd.h>
 
+#include <cstddef>
+#include <cstdlib>
 #include <stdexcept>
+#include <string>
+
+#include "support/openssl.h"
 
 namespace Tarnik::Testing {
 namespace {

@@ -16,13 +16,13 @@ struct Identity {
   OpenSsl::OwnedKey key;
 
   std::string Pem() const;
-  /// As the platform sees it.
+  /// As a certificate of the library.
   Ref<const Crypto::Certificate> ToCertificate() const;
 };
 
 struct IdentityOptions {
   std::string commonName = "sts.example";
-  /// Raw bytes of the dNSName entries; a NUL stays where it is.
+  /// Raw bytes of the dNSName entries, which may contain NUL.
   std::vector<std::string> dnsNames = {"sts.example"};
   std::vector<std::string> addresses = {};
   bool isCa = false;
@@ -31,19 +31,19 @@ struct IdentityOptions {
   long notAfter = 3600;
   /// For example "clientAuth"; none if empty.
   std::string extendedKeyUsage = "";
-  /// The bits of an RSA key; 0 stands for a key on P-256.
+  /// The bits of an RSA key; 0 means a key on P-256.
   unsigned rsaBits = 0;
 };
 
-/// Issued by `issuer`, or by itself if that is null.
+/// Issued by `issuer`, or self-signed if that is null.
 Identity MakeIdentity(const IdentityOptions& options, const Identity* issuer);
 Identity MakeCa(const std::string& commonName, const Identity* issuer = nullptr);
 
-/// A PEM revocation list of `issuer` that revokes `revoked`; null revokes nothing. `nextUpdate` is
-/// in seconds from now.
+/// A PEM revocation list of `issuer` that revokes `revoked`, or nothing if that is null.
+/// `nextUpdate` is in seconds from now.
 std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUpdate = 3600);
 
-/// A file in the folder for temporary files that goes with its owner.
+/// A file in the folder for temporary files, removed with its owner.
 class TemporaryFile {
  public:
   explicit TemporaryFile(const std::string& content);

@@ -5,9 +5,14 @@
 #include <sys/socket.h>
 #include <sys/time.h>
 
-#include <algorithm>
+#include <cstddef>
 #include <stdexcept>
+#include <string>
 #include <utility>
+#include <vector>
+
+#include "support/openssl.h"
+#include "support/test_pki.h"
 
 namespace Tarnik::Testing {
 namespace {
@@ -20,7 +25,7 @@ void LimitWaits(int socket) {
   setsockopt(socket, SOL_SOCKET, SO_SNDTIMEO, &limit, sizeof(limit));
 }
 
-// OpenSSL writes to sockets in a way that raises SIGPIPE when the peer has gone.
+// OpenSSL's writes to sockets raise SIGPIPE when the peer has gone.
 void IgnoreBrokenPipes() {
   sigset_t brokenPipe;
   sigemptyset(&brokenPipe);

@@ -1,6 +1,7 @@
 #ifndef TARNIK_TESTS_SUPPORT_TLS_PEER_H
 #define TARNIK_TESTS_SUPPORT_TLS_PEER_H
 
+#include <cstddef>
 #include <functional>
 #include <string>
 #include <thread>
@@ -12,9 +13,9 @@
 
 namespace Tarnik::Testing {
 
-/// How the server's side of a TLS connection behaves. It is OpenSSL itself, used directly.
+/// How the server side of a TLS connection behaves. The server uses OpenSSL directly.
 struct TlsPeerOptions {
-  /// None presents no certificate, as for anonymous suites.
+  /// Null presents no certificate, as for anonymous suites.
   const Identity* identity = nullptr;
   /// Sent after the identity's own certificate.
   std::vector<const Identity*> chain = {};
@@ -22,13 +23,13 @@ struct TlsPeerOptions {
   int maxVersion = TLS1_3_VERSION;
   std::string ciphers = "DEFAULT";
   int securityLevel = 2;
-  /// If set, the client must present a certificate that this CA stands behind.
+  /// If set, the client must present a certificate issued by this CA.
   const Identity* clientCa = nullptr;
 };
 
 OpenSsl::OwnedSslContext MakeServerContext(const TlsPeerOptions& options);
 
-/// A TLS server on the loopback interface that serves one connection after the other.
+/// A TLS server on the loopback interface that serves one connection at a time.
 class TlsServer {
  public:
   struct Connection {
@@ -40,14 +41,15 @@ class TlsServer {
   };
   using Handler = std::function<void(SSL*)>;
 
-  /// `serve` runs after each handshake that succeeds; empty says "hello" and closes in order.
+  /// `serve` runs after each successful handshake; if empty, the server sends "hello" and closes in
+  /// order.
   TlsServer(const TlsPeerOptions& options, int connections, Handler serve = {});
   ~TlsServer() { Join(); }
   TlsServer(const TlsServer&) = delete;
   TlsServer& operator=(const TlsServer&) = delete;
 
   int Port() const { return listener_.Port(); }
-  /// What the server has seen, once all connections have been served.
+  /// Waits until all connections have been served; returns what the server has seen.
   const std::vector<Connection>& Join();
 
  private:
@@ -60,7 +62,7 @@ class TlsServer {
   std::thread thread_;
 };
 
-/// All bytes of `data` by one or more `SSL_write`; false when the peer has gone.
+/// Writes all of `data`; returns false if the peer has gone.
 bool TlsWrite(SSL* ssl, const std::string& data);
 std::string TlsReadExactly(SSL* ssl, std::size_t size);
 

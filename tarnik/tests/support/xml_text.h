@@ -1,9 +1,6 @@
 #ifndef TARNIK_TESTS_SUPPORT_XML_TEXT_H
 #define TARNIK_TESTS_SUPPORT_XML_TEXT_H
 
-#include <string>
-#include <utility>
-
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/reader.h>
 #include <tarnik/core/writer.h>
@@ -11,7 +8,10 @@
 #include <tarnik/xml/xml_parser.h>
 #include <tarnik/xml/xml_writer.h>
 
-namespace Tarnik::TestSupport {
+#include <string>
+#include <string_view>
+
+namespace Tarnik::Testing {
 
 inline Ref<Xml::Document> ParseXml(Reader* reader) {
   const Ref<Xml::XMLHandler> handler = Xml::CreateXMLDocumentHandler();
@@ -19,8 +19,8 @@ inline Ref<Xml::Document> ParseXml(Reader* reader) {
   return Ref<Xml::Document>(CheckedCast<Xml::Document>(parsed.get()));
 }
 
-inline Ref<Xml::Document> ParseXml(std::string text) {
-  return ParseXml(CreateStringReader(std::move(text)).get());
+inline Ref<Xml::Document> ParseXml(std::string_view text) {
+  return ParseXml(CreateStringReader(std::string(text)).get());
 }
 
 inline std::string XmlText(const Xml::Node* node) {
@@ -29,6 +29,6 @@ inline std::string XmlText(const Xml::Node* node) {
   return writer->TakeText();
 }
 
-}  // namespace Tarnik::TestSupport
+}  // namespace Tarnik::Testing
 
 #endif

@@ -5,10 +5,12 @@
 
 #include <memory>
 
-namespace Tarnik::System {
+namespace Tarnik::Testing {
 namespace {
 
-TEST(CancellableItem, RunsItsFunctionAtEachCancelAndReturnsItsAnswer) {
+using namespace Tarnik::System;
+
+TEST(CancellableItemTest, RunsItsFunctionAtEachCancelAndReturnsItsResult) {
   int calls = 0;
   const auto item = CreateCancellableItem([&calls] { return ++calls == 1; });
   EXPECT_EQ(calls, 0);
@@ -17,11 +19,11 @@ TEST(CancellableItem, RunsItsFunctionAtEachCancelAndReturnsItsAnswer) {
   EXPECT_EQ(calls, 2);
 }
 
-TEST(CancellableItem, RefusesAnEmptyFunction) {
+TEST(CancellableItemTest, RefusesAnEmptyFunction) {
   EXPECT_THROW(CreateCancellableItem({}), InvalidArgumentException);
 }
 
-TEST(CancellableItem, DropsWhatItsFunctionHoldsWithItself) {
+TEST(CancellableItemTest, ReleasesWhatItsFunctionHolds) {
   auto held = std::make_shared<int>(1);
   auto item = CreateCancellableItem([held] { return *held == 1; });
   EXPECT_EQ(held.use_count(), 2);
@@ -30,4 +32,4 @@ TEST(CancellableItem, DropsWhatItsFunctionHoldsWithItself) {
 }
 
 }  // namespace
-}  // namespace Tarnik::System
+}  // namespace Tarnik::Testing

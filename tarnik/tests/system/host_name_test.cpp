@@ -3,10 +3,16 @@
 #include <gtest/gtest.h>
 #include <tarnik/core/exception.h>
 
-namespace Tarnik::System {
+#include <string>
+
+#include "support/thrown_message.h"
+
+namespace Tarnik::Testing {
 namespace {
 
-TEST(HostName, AcceptsNamesAndAddresses) {
+using namespace Tarnik::System;
+
+TEST(HostNameTest, AcceptsNamesAndAddresses) {
   for (const char* host : {"localhost", "sts.example", "sts.example.", "xn--caf-dma.example",
                            "a_b.example", "127.0.0.1", "::1", "fe80::1%eth0"}) {
     EXPECT_NO_THROW(RequireHostName(host)) << host;
@@ -14,7 +20,7 @@ TEST(HostName, AcceptsNamesAndAddresses) {
   EXPECT_NO_THROW(RequireHostName(std::string(253, 'a')));
 }
 
-TEST(HostName, TellsAddressesFromNames) {
+TEST(HostNameTest, DistinguishesAddressesFromNames) {
   for (const char* host : {"127.0.0.1", "::1", "2001:db8::2", "fe80::1%eth0"}) {
     EXPECT_TRUE(IsAddressLiteral(host)) << host;
   }
@@ -23,19 +29,15 @@ TEST(HostName, TellsAddressesFromNames) {
   }
 }
 
-TEST(HostName, DescribesEndpoints) {
+TEST(HostNameTest, DescribesEndpoints) {
   EXPECT_EQ(DescribeEndpoint("sts.example", 443), "sts.example:443");
   EXPECT_EQ(DescribeEndpoint("::1", 8443), "[::1]:8443");
 }
 
-TEST(HostName, DoesNotRepeatWhatItRefuses) {
-  try {
-    RequireHostName("secret\nhost");
-    FAIL();
-  } catch (const InvalidArgumentException& e) {
-    EXPECT_EQ(e.Message(), "The host name holds a character that no host name may hold.");
-  }
+TEST(HostNameTest, DoesNotRepeatWhatItRefuses) {
+  EXPECT_EQ(ThrownMessage<InvalidArgumentException>([] { RequireHostName("secret\nhost"); }),
+            "The host name holds a character that no host name may hold.");
 }
 
 }  // namespace
-}  // namespace Tarnik::System
+}  // namespace Tarnik::Testing

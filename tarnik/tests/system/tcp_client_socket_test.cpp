@@ -6,10 +6,14 @@
 #include <netinet/in.h>
 #include <netinet/tcp.h>
 #include <sys/socket.h>
+#include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/system/thread_pool.h>
 
 #include <atomic>
 #include <chrono>
+#include <cstddef>
+#include <functional>
 #include <string>
 #include <thread>
 #include <vector>
@@ -17,15 +21,11 @@
 #include "support/loopback.h"
 #include "support/outcome.h"
 
-namespace Tarnik::System {
+namespace Tarnik::Testing {
 namespace {
 
+using namespace Tarnik::System;
 using namespace std::chrono_literals;
-using Testing::Descriptor;
-using Testing::LoopbackListener;
-using Testing::Outcome;
-using Testing::ReadAll;
-using Testing::WriteAll;
 
 Ref<TCPClientSocket> NewSocket() {
   return CreateTCPClientSocket(GetThreadPool().get());
@@ -41,7 +41,7 @@ std::string Connect(TCPClientSocket& socket, const std::string& host, int port) 
   return outcome.Wait() ? outcome.Message() : "no completion";
 }
 
-/// A connected pair: the socket under test and its peer's descriptor.
+/// A connected pair: the socket under test and the descriptor of its peer.
 struct Pair {
   Pair() {
     EXPECT_EQ(Connect(*socket, "127.0.0.1", listener.Port()), "");
@@ -54,7 +54,20 @@ struct Pair {
   Descriptor peer;
 };
 
-TEST(TCPClientSocketAsync, ConnectsToAnAddressAndGivesItselfToTheCompletion) {
+/// A read and a write of `socket` that do not complete by themselves.
+struct PendingTransfers {
+  explicit PendingTransfers(TCPClientSocket& socket) {
+    socket.ReadAsync(buffer, sizeof(buffer), read.ForRead());
+    socket.WriteAsync(data.data(), data.size(), write.ForWrite());
+  }
+
+  char buffer[10];
+  const std::string data = std::string(64 << 20, 'x');
+  const Outcome read;
+  const Outcome write;
+};
+
+TEST(TCPClientSocketAsyncTest, ConnectsToAnAddressAndPassesItselfToTheCompletion) {
   const LoopbackListener listener;
   const auto socket = NewSocket();
   std::atomic<TCPClientSocket*> given{nullptr};
@@ -71,22 +84,22 @@ TEST(TCPClientSocketAsync, ConnectsToAnAddressAndGivesItselfToTheCompletion) {
             "<TCPClientSocket:127.0.0.1:" + std::to_string(listener.Port()) + ">");
 }
 
-TEST(TCPClientSocketAsync, ConnectsToAName) {
+TEST(TCPClientSocketAsyncTest, ConnectsToAName) {
   const LoopbackListener listener;
   EXPECT_EQ(Connect(*NewSocket(), "localhost", listener.Port()), "");
 }
 
-TEST(TCPClientSocketAsync, ConnectsToAnIpv6AddressWithoutBrackets) {
-  if (!Testing::HasIpv6Loopback()) {
+TEST(TCPClientSocketAsyncTest, ConnectsToAnIpv6AddressWithoutBrackets) {
+  if (!HasIpv6Loopback()) {
     GTEST_SKIP() << "this machine has no IPv6";
   }
   const LoopbackListener listener(true);
   EXPECT_EQ(Connect(*NewSocket(), "::1", listener.Port()), "");
 }
 
-TEST(TCPClientSocketAsync, NamesHostPortAndCauseOfARefusal) {
+TEST(TCPClientSocketAsyncTest, NamesHostPortAndCauseOfARefusal) {
   Descriptor holder;
-  const int port = Testing::RefusingPort(holder);
+  const int port = RefusingPort(holder);
   const auto socket = NewSocket();
   const Outcome outcome;
   socket->ConnectAsync("127.0.0.1", port, ForConnect(outcome));
@@ -97,25 +110,25 @@ TEST(TCPClientSocketAsync, NamesHostPortAndCauseOfARefusal) {
   EXPECT_FALSE(outcome.IsError<CancelledException>());
 }
 
-TEST(TCPClientSocketAsync, PutsAnIpv6AddressOfAMessageIntoBrackets) {
-  if (!Testing::HasIpv6Loopback()) {
+TEST(TCPClientSocketAsyncTest, PutsAnIpv6AddressInBracketsInMessages) {
+  if (!HasIpv6Loopback()) {
     GTEST_SKIP() << "this machine has no IPv6";
   }
   Descriptor holder;
-  const int port = Testing::RefusingPort(holder);
+  const int port = RefusingPort(holder);
   EXPECT_EQ(Connect(*NewSocket(), "::1", port),
             "Cannot connect to [::1]:" + std::to_string(port) + ": Connection refused");
 }
 
-TEST(TCPClientSocketAsync, TriesEachAddressOfANameInTurn) {
-  // "localhost" may stand for ::1 as well; the listener has 127.0.0.1 alone.
+TEST(TCPClientSocketAsyncTest, TriesEachAddressOfANameInTurn) {
+  // "localhost" may resolve to ::1 as well; the listener has only 127.0.0.1.
   const LoopbackListener listener;
   const auto socket = NewSocket();
   ASSERT_EQ(Connect(*socket, "localhost", listener.Port()), "");
   EXPECT_GE(listener.Accept().Get(), 0);
 }
 
-TEST(TCPClientSocketAsync, NamesTheHostThatCannotBeResolved) {
+TEST(TCPClientSocketAsyncTest, NamesTheHostThatCannotBeResolved) {
   const auto socket = NewSocket();
   const Outcome outcome;
   socket->ConnectAsync("nonexistent.invalid", 443, ForConnect(outcome));
@@ -130,7 +143,7 @@ TEST(TCPClientSocketAsync, NamesTheHostThatCannotBeResolved) {
   EXPECT_TRUE(outcome.IsError<IOException>());
 }
 
-TEST(TCPClientSocketAsync, RefusesAHostThatCanBeNone) {
+TEST(TCPClientSocketAsyncTest, RefusesMalformedHosts) {
   const std::vector<std::string> hosts = {
       "",    " ",   "a b", "a\r\nb", "a\nb",        "a\tb", {"a\0b", 3},          "[::1]",
       "a/b", "a@b", ".a",  "a\x7f",  "caf\xc3\xa9", "a\\b", std::string(254, 'a')};
@@ -141,20 +154,20 @@ TEST(TCPClientSocketAsync, RefusesAHostThatCanBeNone) {
   }
 }
 
-TEST(TCPClientSocketAsync, RefusesAPortThatIsNone) {
+TEST(TCPClientSocketAsyncTest, RefusesPortsOutOfRange) {
   for (const int port : {-1, 0, 65536}) {
     EXPECT_THROW(NewSocket()->ConnectAsync("localhost", port, ForConnect(Outcome())),
                  InvalidArgumentException);
   }
 }
 
-TEST(TCPClientSocketAsync, RefusesToConnectTwice) {
+TEST(TCPClientSocketAsyncTest, RefusesToConnectTwice) {
   const Pair pair;
   EXPECT_THROW(pair.socket->ConnectAsync("localhost", 1, ForConnect(Outcome())),
                InvalidStateException);
 }
 
-TEST(TCPClientSocketAsync, RefusesAPoolThatIsNotTheProcesss) {
+TEST(TCPClientSocketAsyncTest, RefusesAForeignPool) {
   class OtherPool final : public ThreadPool, public ObjectImpl {
     void Run(std::function<void()>) override {}
     void Post(std::function<void()>) override {}
@@ -165,15 +178,15 @@ TEST(TCPClientSocketAsync, RefusesAPoolThatIsNotTheProcesss) {
   EXPECT_THROW(CreateTCPClientSocket(nullptr), InvalidArgumentException);
 }
 
-TEST(TCPClientSocketAsync, RefusesToReadAndWriteUnlessConnected) {
+TEST(TCPClientSocketAsyncTest, RefusesToReadAndWriteUnlessConnected) {
   char buffer[1];
   const auto socket = NewSocket();
   EXPECT_THROW(socket->ReadAsync(buffer, 1, Outcome().ForRead()), InvalidStateException);
   EXPECT_THROW(socket->WriteAsync(buffer, 1, Outcome().ForWrite()), InvalidStateException);
 }
 
-TEST(TCPClientSocketAsync, SwitchesOffTheDelayOfSmallWrites) {
-  // The peer cannot see the option, so look at the process's own sockets.
+TEST(TCPClientSocketAsyncTest, DisablesTheDelayOfSmallWrites) {
+  // The peer cannot see the option, so inspect the sockets of this process.
   const Pair pair;
   sockaddr_in peerName{};
   socklen_t length = sizeof(peerName);
@@ -194,18 +207,18 @@ TEST(TCPClientSocketAsync, SwitchesOffTheDelayOfSmallWrites) {
   EXPECT_TRUE(found);
 }
 
-TEST(TCPClientSocketAsync, ReadsWhatThePeerSendsUpToItsEnd) {
+TEST(TCPClientSocketAsyncTest, ReadsWhatThePeerSendsUntilTheEnd) {
   Pair pair;
-  ASSERT_TRUE(Testing::SendAll(pair.peer.Get(), "hello"));
+  ASSERT_TRUE(SendAll(pair.peer.Get(), "hello"));
   pair.peer.Close();
   std::string error;
   EXPECT_EQ(ReadAll(*pair.socket, 100, &error), "hello");
   EXPECT_EQ(error, "");
 }
 
-TEST(TCPClientSocketAsync, ReportsAResetWithItsPeer) {
+TEST(TCPClientSocketAsyncTest, ReportsAResetAndNamesThePeer) {
   Pair pair;
-  Testing::ResetOnClose(pair.peer.Get());
+  ResetOnClose(pair.peer.Get());
   pair.peer.Close();
   std::string error;
   EXPECT_EQ(ReadAll(*pair.socket, 100, &error), "");
@@ -213,9 +226,9 @@ TEST(TCPClientSocketAsync, ReportsAResetWithItsPeer) {
                        ": Connection reset by peer");
 }
 
-TEST(TCPClientSocketAsync, ReportsAWriteToAPeerThatHasGone) {
+TEST(TCPClientSocketAsyncTest, ReportsAWriteToAPeerThatHasGone) {
   Pair pair;
-  Testing::ResetOnClose(pair.peer.Get());
+  ResetOnClose(pair.peer.Get());
   pair.peer.Close();
   std::string error;
   for (int i = 0; i < 100 && error.empty(); ++i) {
@@ -225,7 +238,7 @@ TEST(TCPClientSocketAsync, ReportsAWriteToAPeerThatHasGone) {
                                          std::to_string(pair.listener.Port()) + ": "));
 }
 
-TEST(TCPClientSocketAsync, MovesMuchDataBothWaysAtOnce) {
+TEST(TCPClientSocketAsyncTest, TransfersMuchDataInBothDirectionsAtOnce) {
   const Pair pair;
   std::string sent(4 << 20, '\0');
   for (std::size_t i = 0; i < sent.size(); ++i) {
@@ -233,8 +246,8 @@ TEST(TCPClientSocketAsync, MovesMuchDataBothWaysAtOnce) {
   }
   std::string received;
   std::thread peer([&] {
-    std::thread sender([&] { Testing::SendAll(pair.peer.Get(), sent); });
-    received = Testing::ReceiveExactly(pair.peer.Get(), sent.size());
+    std::thread sender([&] { SendAll(pair.peer.Get(), sent); });
+    received = ReceiveExactly(pair.peer.Get(), sent.size());
     sender.join();
   });
   const Outcome written;
@@ -249,54 +262,46 @@ TEST(TCPClientSocketAsync, MovesMuchDataBothWaysAtOnce) {
   EXPECT_TRUE(received == sent);
 }
 
-TEST(TCPClientSocketAsync, WritesNothingAtOnce) {
+TEST(TCPClientSocketAsyncTest, CompletesAnEmptyWrite) {
   const Pair pair;
   EXPECT_EQ(WriteAll(*pair.socket, ""), "");
 }
 
-TEST(TCPClientSocketAsync, RefusesASecondReadAndASecondWriteAtOnce) {
+TEST(TCPClientSocketAsyncTest, RefusesASecondReadAndASecondWriteAtTheSameTime) {
   const Pair pair;
-  char buffer[10];
-  const std::string much(64 << 20, 'x');
-  const Outcome read;
-  const Outcome write;
-  pair.socket->ReadAsync(buffer, sizeof(buffer), read.ForRead());
-  pair.socket->WriteAsync(much.data(), much.size(), write.ForWrite());
-  EXPECT_THROW(pair.socket->ReadAsync(buffer, 1, read.ForRead()), InvalidStateException);
-  EXPECT_THROW(pair.socket->WriteAsync(buffer, 1, write.ForWrite()), InvalidStateException);
+  PendingTransfers pending(*pair.socket);
+  EXPECT_THROW(pair.socket->ReadAsync(pending.buffer, 1, pending.read.ForRead()),
+               InvalidStateException);
+  EXPECT_THROW(pair.socket->WriteAsync(pending.buffer, 1, pending.write.ForWrite()),
+               InvalidStateException);
   pair.socket->Close();
-  EXPECT_TRUE(read.Wait());
-  EXPECT_TRUE(write.Wait());
-  EXPECT_EQ(read.Count(), 1);
-  EXPECT_EQ(write.Count(), 1);
+  EXPECT_TRUE(pending.read.Wait());
+  EXPECT_TRUE(pending.write.Wait());
+  EXPECT_EQ(pending.read.Count(), 1);
+  EXPECT_EQ(pending.write.Count(), 1);
 }
 
-TEST(TCPClientSocketAsync, RefusesAReadOfNothing) {
+TEST(TCPClientSocketAsyncTest, RefusesAnEmptyRead) {
   const Pair pair;
   EXPECT_THROW(pair.socket->ReadAsync(nullptr, 0, Outcome().ForRead()), InvalidArgumentException);
 }
 
-TEST(TCPClientSocketAsync, CancelsReadAndWriteUnderWayAtClose) {
+TEST(TCPClientSocketAsyncTest, CancelsPendingReadAndWriteAtClose) {
   const Pair pair;
-  char buffer[10];
-  const std::string much(64 << 20, 'x');
-  const Outcome read;
-  const Outcome write;
-  pair.socket->ReadAsync(buffer, sizeof(buffer), read.ForRead());
-  pair.socket->WriteAsync(much.data(), much.size(), write.ForWrite());
+  const PendingTransfers pending(*pair.socket);
   pair.socket->Close();
   pair.socket->Close();
-  ASSERT_TRUE(read.Wait());
-  ASSERT_TRUE(write.Wait());
+  ASSERT_TRUE(pending.read.Wait());
+  ASSERT_TRUE(pending.write.Wait());
   const std::string closed = "The connection to 127.0.0.1:" + std::to_string(pair.listener.Port()) +
                              " was closed on this side.";
-  EXPECT_TRUE(read.IsError<CancelledException>());
-  EXPECT_TRUE(write.IsError<CancelledException>());
-  EXPECT_EQ(read.Message(), closed);
-  EXPECT_EQ(write.Message(), closed);
+  EXPECT_TRUE(pending.read.IsError<CancelledException>());
+  EXPECT_TRUE(pending.write.IsError<CancelledException>());
+  EXPECT_EQ(pending.read.Message(), closed);
+  EXPECT_EQ(pending.write.Message(), closed);
 }
 
-TEST(TCPClientSocketAsync, CancelsReadsAndWritesAfterClose) {
+TEST(TCPClientSocketAsyncTest, CancelsReadsAndWritesAfterClose) {
   const Pair pair;
   pair.socket->Close();
   char buffer[1];
@@ -307,7 +312,7 @@ TEST(TCPClientSocketAsync, CancelsReadsAndWritesAfterClose) {
   EXPECT_EQ(WriteAll(*pair.socket, "x"), read.Message());
 }
 
-TEST(TCPClientSocketAsync, CancelsTheConnectOfAClosedSocket) {
+TEST(TCPClientSocketAsyncTest, CancelsTheConnectOfAClosedSocket) {
   const auto socket = NewSocket();
   socket->Close();
   const Outcome outcome;
@@ -316,7 +321,7 @@ TEST(TCPClientSocketAsync, CancelsTheConnectOfAClosedSocket) {
   EXPECT_TRUE(outcome.IsError<CancelledException>());
 }
 
-TEST(TCPClientSocketAsync, CancelsAConnectDuringItsLookUp) {
+TEST(TCPClientSocketAsyncTest, CancelsAConnectDuringItsLookup) {
   for (int i = 0; i < 50; ++i) {
     const auto socket = NewSocket();
     const Outcome outcome;
@@ -328,8 +333,8 @@ TEST(TCPClientSocketAsync, CancelsAConnectDuringItsLookUp) {
   }
 }
 
-TEST(TCPClientSocketAsync, CancelsAConnectThatNobodyAnswers) {
-  // A full backlog leaves further connects without an answer.
+TEST(TCPClientSocketAsyncTest, CancelsAnUnansweredConnect) {
+  // Connects beyond a full backlog stay unanswered.
   const LoopbackListener listener(false, 0);
   std::vector<Ref<TCPClientSocket>> fillers;
   Ref<TCPClientSocket> waiting;
@@ -353,7 +358,7 @@ TEST(TCPClientSocketAsync, CancelsAConnectThatNobodyAnswers) {
   }
 }
 
-TEST(TCPClientSocketAsync, CompletesOnceWhateverClosesWhen) {
+TEST(TCPClientSocketAsyncTest, CompletesOnceWheneverItIsClosed) {
   for (int i = 0; i < 200; ++i) {
     const LoopbackListener listener;
     const auto socket = NewSocket();
@@ -371,7 +376,7 @@ TEST(TCPClientSocketAsync, CompletesOnceWhateverClosesWhen) {
   }
 }
 
-TEST(TCPClientSocketAsync, LivesUntilItsOperationHasEnded) {
+TEST(TCPClientSocketAsyncTest, LivesUntilItsOperationHasEnded) {
   LoopbackListener listener;
   char buffer[10];
   const Outcome read;
@@ -382,13 +387,13 @@ TEST(TCPClientSocketAsync, LivesUntilItsOperationHasEnded) {
     peer = listener.Accept();
     socket->ReadAsync(buffer, sizeof(buffer), read.ForRead());
   }
-  ASSERT_TRUE(Testing::SendAll(peer.Get(), "late"));
+  ASSERT_TRUE(SendAll(peer.Get(), "late"));
   ASSERT_TRUE(read.Wait());
   EXPECT_EQ(read.Bytes(), 4U);
-  EXPECT_EQ(Testing::ReceiveExactly(peer.Get(), 1), "");
+  EXPECT_EQ(ReceiveExactly(peer.Get(), 1), "");
 }
 
-TEST(TCPClientSocketAsync, HoldsManyConnectionsAtOnce) {
+TEST(TCPClientSocketAsyncTest, SupportsManyConnectionsAtOnce) {
   const LoopbackListener listener;
   constexpr std::size_t kConnections = 100;
   std::vector<Ref<TCPClientSocket>> sockets;
@@ -407,4 +412,4 @@ TEST(TCPClientSocketAsync, HoldsManyConnectionsAtOnce) {
 }
 
 }  // namespace
-}  // namespace Tarnik::System
+}  // namespace Tarnik::Testing

@@ -8,27 +8,29 @@
 #include <chrono>
 #include <future>
 #include <memory>
+#include <mutex>
 #include <set>
+#include <thread>
 #include <vector>
 
 #include "support/outcome.h"
 
-namespace Tarnik::System {
+namespace Tarnik::Testing {
 namespace {
 
+using namespace Tarnik::System;
 using namespace std::chrono_literals;
-using Testing::kPatience;
 
 bool IsReadyInTime(std::future<void> result) {
   return result.wait_for(kPatience) == std::future_status::ready;
 }
 
-TEST(ThreadPoolAsync, IsOneForTheProcess) {
+TEST(ThreadPoolTest, IsTheSameForTheWholeProcess) {
   EXPECT_EQ(GetThreadPool(), GetThreadPool());
   EXPECT_EQ(GetThreadPool()->ToString(), "<ThreadPool>");
 }
 
-TEST(ThreadPoolAsync, RunsAnItemOnAnotherThread) {
+TEST(ThreadPoolTest, RunsAnItemOnAnotherThread) {
   std::promise<std::thread::id> ran;
   GetThreadPool()->Run([&] { ran.set_value(std::this_thread::get_id()); });
   auto result = ran.get_future();
@@ -36,13 +38,13 @@ TEST(ThreadPoolAsync, RunsAnItemOnAnotherThread) {
   EXPECT_NE(result.get(), std::this_thread::get_id());
 }
 
-TEST(ThreadPoolAsync, RefusesEmptyFunctions) {
+TEST(ThreadPoolTest, RefusesEmptyFunctions) {
   EXPECT_THROW(GetThreadPool()->Run({}), InvalidArgumentException);
   EXPECT_THROW(GetThreadPool()->Post({}), InvalidArgumentException);
   EXPECT_THROW(GetThreadPool()->RunAfter(1, {}), InvalidArgumentException);
 }
 
-TEST(ThreadPoolAsync, NeverRunsACompletionInsideThePostingCompletion) {
+TEST(ThreadPoolTest, NeverRunsACompletionInsideThePostingCompletion) {
   static thread_local bool isPosting = false;
   std::promise<bool> ranInside;
   GetThreadPool()->Post([&] {
@@ -55,7 +57,7 @@ TEST(ThreadPoolAsync, NeverRunsACompletionInsideThePostingCompletion) {
   EXPECT_FALSE(result.get());
 }
 
-TEST(ThreadPoolAsync, RunsCompletionsOnFewThreads) {
+TEST(ThreadPoolTest, RunsCompletionsOnFewThreads) {
   std::mutex mutex;
   std::set<std::thread::id> threads;
   std::promise<void> done;
@@ -75,7 +77,7 @@ TEST(ThreadPoolAsync, RunsCompletionsOnFewThreads) {
   EXPECT_LE(threads.size(), 2U);
 }
 
-TEST(ThreadPoolAsync, RunsCompletionsWhileEveryWorkerIsBlocked) {
+TEST(ThreadPoolTest, RunsCompletionsWhileEveryWorkerIsBlocked) {
   std::promise<void> gate;
   const auto opened = gate.get_future().share();
   std::atomic<int> blocked{0};
@@ -103,7 +105,7 @@ TEST(ThreadPoolAsync, RunsCompletionsWhileEveryWorkerIsBlocked) {
   EXPECT_TRUE(IsReadyInTime(allEnded.get_future()));
 }
 
-TEST(ThreadPoolAsync, RunsATimerNotBeforeItsTime) {
+TEST(ThreadPoolTest, DoesNotRunATimerEarly) {
   const auto begin = std::chrono::steady_clock::now();
   std::promise<void> ran;
   GetThreadPool()->RunAfter(20000, [&] { ran.set_value(); });
@@ -111,7 +113,7 @@ TEST(ThreadPoolAsync, RunsATimerNotBeforeItsTime) {
   EXPECT_GE(std::chrono::steady_clock::now() - begin, 20ms);
 }
 
-TEST(ThreadPoolAsync, RunsTimersInTheOrderOfTheirTimes) {
+TEST(ThreadPoolTest, RunsTimersInTheOrderOfTheirTimes) {
   std::vector<int> order;
   std::mutex mutex;
   std::promise<void> done;
@@ -122,7 +124,7 @@ TEST(ThreadPoolAsync, RunsTimersInTheOrderOfTheirTimes) {
       order.push_back(number);
       isLast = order.size() == 2;
     }
-    // Not under the lock, which dies with the test as soon as it is done.
+    // Not under the lock, which is destroyed as soon as the test is done.
     if (isLast) {
       done.set_value();
     }
@@ -133,7 +135,7 @@ TEST(ThreadPoolAsync, RunsTimersInTheOrderOfTheirTimes) {
   EXPECT_EQ(order, (std::vector<int>{1, 2}));
 }
 
-TEST(ThreadPoolAsync, NeverRunsACancelledTimer) {
+TEST(ThreadPoolTest, NeverRunsACancelledTimer) {
   const auto ran = std::make_shared<std::atomic<bool>>(false);
   const auto timer = GetThreadPool()->RunAfter(5000, [ran] { *ran = true; });
   EXPECT_TRUE(timer->Cancel());
@@ -144,14 +146,14 @@ TEST(ThreadPoolAsync, NeverRunsACancelledTimer) {
   EXPECT_FALSE(*ran);
 }
 
-TEST(ThreadPoolAsync, CannotCancelATimerThatHasRun) {
+TEST(ThreadPoolTest, CannotCancelATimerThatHasRun) {
   std::promise<void> ran;
   const auto timer = GetThreadPool()->RunAfter(0, [&] { ran.set_value(); });
   ASSERT_TRUE(IsReadyInTime(ran.get_future()));
   EXPECT_FALSE(timer->Cancel());
 }
 
-TEST(ThreadPoolAsync, DropsWhatACancelledTimerHoldsAtOnce) {
+TEST(ThreadPoolTest, ReleasesWhatACancelledTimerHoldsAtOnce) {
   auto held = std::make_shared<int>(1);
   const auto timer = GetThreadPool()->RunAfter(60000000, [held] { (void)held; });
   EXPECT_EQ(held.use_count(), 2);
@@ -159,7 +161,7 @@ TEST(ThreadPoolAsync, DropsWhatACancelledTimerHoldsAtOnce) {
   EXPECT_EQ(held.use_count(), 1);
 }
 
-TEST(ThreadPoolAsync, TakesTheLongestDelayThatThereIs) {
+TEST(ThreadPoolTest, AcceptsTheLongestDelay) {
   const auto ran = std::make_shared<std::atomic<bool>>(false);
   const auto timer = GetThreadPool()->RunAfter(~0UL, [ran] { *ran = true; });
   std::promise<void> later;
@@ -169,7 +171,7 @@ TEST(ThreadPoolAsync, TakesTheLongestDelayThatThereIs) {
   EXPECT_TRUE(timer->Cancel());
 }
 
-TEST(ThreadPoolAsync, CancelsAndRunsEachTimerOfARaceOnce) {
+TEST(ThreadPoolTest, EitherCancelsOrRunsEachTimerInARace) {
   constexpr int kTimers = 500;
   std::atomic<int> ran{0};
   int cancelled = 0;
@@ -184,7 +186,7 @@ TEST(ThreadPoolAsync, CancelsAndRunsEachTimerOfARaceOnce) {
   EXPECT_EQ(ran + cancelled, kTimers);
 }
 
-TEST(ThreadPoolAsync, BlocksTheHostsSignalsOnItsThreads) {
+TEST(ThreadPoolTest, BlocksTheHostsSignalsOnItsThreads) {
   std::promise<bool> blocked;
   GetThreadPool()->Run([&] {
     sigset_t mask;
@@ -196,4 +198,4 @@ TEST(ThreadPoolAsync, BlocksTheHostsSignalsOnItsThreads) {
 }
 
 }  // namespace
-}  // namespace Tarnik::System
+}  // namespace Tarnik::Testing

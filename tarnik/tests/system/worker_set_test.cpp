@@ -3,16 +3,21 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <chrono>
+#include <cstddef>
 #include <future>
 #include <memory>
+#include <thread>
+#include <utility>
 #include <vector>
 
-namespace Tarnik::System {
+namespace Tarnik::Testing {
 namespace {
 
+using namespace Tarnik::System;
 using namespace std::chrono_literals;
 
-TEST(WorkerPool, GrowsWhileAllWorkersAreBusy) {
+TEST(WorkerSetConcurrencyTest, GrowsWhileAllWorkersAreBusy) {
   std::promise<void> gate;
   const auto opened = gate.get_future().share();
   std::atomic<int> started{0};
@@ -31,7 +36,7 @@ TEST(WorkerPool, GrowsWhileAllWorkersAreBusy) {
   gate.set_value();
 }
 
-TEST(WorkerPool, QueuesInOrderPastItsMaximum) {
+TEST(WorkerSetConcurrencyTest, QueuesItemsInOrderBeyondItsMaximum) {
   std::promise<void> gate;
   const auto opened = gate.get_future().share();
   std::vector<int> order;
@@ -53,9 +58,9 @@ TEST(WorkerPool, QueuesInOrderPastItsMaximum) {
   }
 }
 
-// A worker that has kept its promise may not be idle yet when the next item comes, and on a busy
-// machine this may happen several times in a row: but not always.
-TEST(WorkerPool, ReusesAnIdleWorker) {
+// A worker that has fulfilled its promise may not be idle yet when the next item comes. On a busy
+// machine this may happen several times in a row, but not every time.
+TEST(WorkerSetConcurrencyTest, ReusesAnIdleWorker) {
   constexpr std::size_t kItems = 100;
   WorkerSet workers("test", kItems, 60s);
   bool isReused = false;
@@ -69,7 +74,7 @@ TEST(WorkerPool, ReusesAnIdleWorker) {
   EXPECT_TRUE(isReused);
 }
 
-TEST(WorkerPool, EndsIdleWorkers) {
+TEST(WorkerSetConcurrencyTest, EndsIdleWorkers) {
   WorkerSet workers("test", 10, 1ms);
   for (int i = 0; i < 4; ++i) {
     std::promise<void> done;
@@ -83,7 +88,7 @@ TEST(WorkerPool, EndsIdleWorkers) {
   EXPECT_EQ(workers.WorkerCount(), 0U);
 }
 
-TEST(WorkerPool, RunsItemsThatWereGivenFromManyThreadsOnceEach) {
+TEST(WorkerSetConcurrencyTest, RunsEachItemFromManyThreadsOnce) {
   std::atomic<int> ran{0};
   std::promise<void> done;
   WorkerSet workers("test", 4, 1ms);
@@ -106,7 +111,7 @@ TEST(WorkerPool, RunsItemsThatWereGivenFromManyThreadsOnceEach) {
   EXPECT_EQ(ran, 2000);
 }
 
-TEST(WorkerPool, DestroysAnItemRightAfterItsRun) {
+TEST(WorkerSetConcurrencyTest, DestroysAnItemRightAfterItHasRun) {
   WorkerSet workers("test", 1, 60s);
   auto held = std::make_shared<int>(0);
   const std::weak_ptr<int> watched = held;
@@ -117,8 +122,8 @@ TEST(WorkerPool, DestroysAnItemRightAfterItsRun) {
   EXPECT_TRUE(watched.expired());
 }
 
-TEST(WorkerPool, StartsNothingOnceFrozenAndWaitsForItemsUnderWay) {
-  // Threads of a frozen set stop for good, so the set is leaked as the process's pool is.
+TEST(WorkerSetConcurrencyTest, StartsNothingOnceFrozenAndWaitsForRunningItems) {
+  // Threads of a frozen set stop for good, so the set is leaked like the pool of the process.
   static auto* const workers = new WorkerSet("test", 2, 60s);
   static std::atomic<bool> first{false};
   static std::atomic<bool> second{false};
@@ -138,7 +143,7 @@ TEST(WorkerPool, StartsNothingOnceFrozenAndWaitsForItemsUnderWay) {
   EXPECT_FALSE(second);
 }
 
-TEST(WorkerPool, GivesUpOnABlockedItemWhenFreezing) {
+TEST(WorkerSetConcurrencyTest, StopsWaitingForABlockedItemWhenFreezing) {
   static auto* const workers = new WorkerSet("test", 2, 60s);
   static std::promise<void> started;
   static std::promise<void> never;
@@ -153,4 +158,4 @@ TEST(WorkerPool, GivesUpOnABlockedItemWhenFreezing) {
 }
 
 }  // namespace
-}  // namespace Tarnik::System
+}  // namespace Tarnik::Testing

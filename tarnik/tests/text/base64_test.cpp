@@ -1,22 +1,25 @@
 #include <tarnik/text/base64.h>
 
 #include <gtest/gtest.h>
-
 #include <tarnik/core/exception.h>
 #include <tarnik/text/string_util.h>
+
 #include <algorithm>
+#include <cstddef>
 #include <limits>
 #include <string>
 #include <vector>
 
-namespace Tarnik {
+#include "support/thrown_message.h"
+
+namespace Tarnik::Testing {
 namespace {
 
 const unsigned char* BytesOf(const std::string& text) {
   return reinterpret_cast<const unsigned char*>(text.data());
 }
 
-/// Encodes into a buffer that has `room` characters, with sentinels around it.
+/// Encodes into a buffer of `room` characters between sentinels.
 std::string Encode(const std::string& bytes, std::size_t room) {
   std::string buffer(room + 2, '#');
   std::size_t written = 12345;
@@ -31,7 +34,7 @@ struct Vector {
   const char* text;
 };
 
-TEST(Base64, EncodesTheVectorsOfRfc4648) {
+TEST(Base64Test, EncodesTheVectorsOfRfc4648) {
   for (const Vector& vector :
        {Vector{"", ""}, Vector{"f", "Zg=="}, Vector{"fo", "Zm8="}, Vector{"foo", "Zm9v"},
         Vector{"foob", "Zm9vYg=="}, Vector{"fooba", "Zm9vYmE="}, Vector{"foobar", "Zm9vYmFy"}}) {
@@ -43,7 +46,7 @@ TEST(Base64, EncodesTheVectorsOfRfc4648) {
   }
 }
 
-TEST(Base64, WritesLongTextsInOneLine) {
+TEST(Base64Test, WritesLongTextsOnOneLine) {
   for (const std::size_t size : {48U, 49U, 3U << 20, (3U << 20) + 1}) {
     std::string bytes(size, '\0');
     for (std::size_t i = 0; i < size; ++i) {
@@ -57,7 +60,7 @@ TEST(Base64, WritesLongTextsInOneLine) {
   }
 }
 
-TEST(Base64, WritesNothingWhereThereIsNoRoom) {
+TEST(Base64Test, WritesNothingToABufferThatIsTooSmall) {
   std::string buffer(8, '#');
   std::size_t written = 12345;
   EXPECT_THROW(Base64_Encode(BytesOf("foobar"), 6, buffer.data(), 7, &written),
@@ -70,17 +73,14 @@ TEST(Base64, WritesNothingWhereThereIsNoRoom) {
   EXPECT_EQ(buffer, "########");
 }
 
-TEST(Base64, SaysHowMuchRoomIsMissing) {
-  try {
-    std::size_t written = 0;
-    Base64_Encode(BytesOf("foobar"), 6, nullptr, 0, &written);
-    FAIL() << "encoded";
-  } catch (const InvalidArgumentException& error) {
-    EXPECT_EQ(error.Message(), "There is no room for a Base64 text of 8 characters.");
-  }
+TEST(Base64Test, ReportsTheRoomThatItNeeds) {
+  std::size_t written = 0;
+  EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
+                [&] { Base64_Encode(BytesOf("foobar"), 6, nullptr, 0, &written); }),
+            "There is no room for a Base64 text of 8 characters.");
 }
 
-TEST(Base64, RefusesBytesThatAreNotThereOrTooMany) {
+TEST(Base64Test, RefusesNullAndTooManyBytes) {
   EXPECT_EQ(Base64_EncodedLength(nullptr, 0), 0U);
   EXPECT_THROW(Base64_EncodedLength(nullptr, 1), InvalidArgumentException);
   constexpr std::size_t kMax = std::numeric_limits<std::size_t>::max();
@@ -90,4 +90,4 @@ TEST(Base64, RefusesBytesThatAreNotThereOrTooMany) {
 }
 
 }  // namespace
-}  // namespace Tarnik
+}  // namespace Tarnik::Testing

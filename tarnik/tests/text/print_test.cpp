@@ -1,11 +1,12 @@
 #include <tarnik/text/print.h>
 
 #include <gtest/gtest.h>
+#include <tarnik/system/date_time.h>
 
 #include <cstdint>
 #include <limits>
 
-namespace Tarnik {
+namespace Tarnik::Testing {
 namespace {
 
 using Detail::ASPrintInternal;
@@ -27,12 +28,12 @@ TEST(ASPrintInternalTest, NumberEndsWhereArgumentsEnd) {
   EXPECT_EQ(ASPrintInternal("%10", {"1", "2", "3", "4", "5", "6", "7", "8", "9", "ten"}), "ten");
 }
 
-TEST(ASPrintInternalTest, EmptyFormatAndNoArguments) {
+TEST(ASPrintInternalTest, AcceptsAnEmptyFormatAndNoArguments) {
   EXPECT_EQ(ASPrintInternal("", {}), "");
   EXPECT_EQ(ASPrintInternal("%1", {}), "%1");
 }
 
-TEST(PrintFormatterTest, PrintsEachKindInItsForm) {
+TEST(PrintFormatterTest, PrintsEachTypeInItsForm) {
   EXPECT_EQ(PrintFormatter(true).Text(), "true");
   EXPECT_EQ(PrintFormatter(false).Text(), "false");
   EXPECT_EQ(PrintFormatter(-5).Text(), "-5");
@@ -45,10 +46,10 @@ TEST(PrintFormatterTest, PrintsEachKindInItsForm) {
             "2024-03-05T07:08:09.010Z");
 }
 
-TEST(DatePrintFormatterTest, PrintsTheFormForPeopleInUtc) {
+TEST(DatePrintFormatterTest, PrintsTheReadableFormInUtc) {
   EXPECT_EQ(DatePrintFormatter(System::DateTime::Parse("2024-03-05T09:08:09.010999+02:00")).Text(),
             "2024-03-05 07:08:09.010 UTC");
 }
 
 }  // namespace
-}  // namespace Tarnik
+}  // namespace Tarnik::Testing

@@ -1,21 +1,26 @@
 #include <tarnik/text/string_util.h>
 
 #include <gmock/gmock.h>
-
-#include <set>
-
+#include <gtest/gtest.h>
 #include <tarnik/core/exception.h>
 
-namespace Tarnik::StringUtil {
+#include <cstddef>
+#include <set>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Tarnik::Testing {
 namespace {
 
+using namespace Tarnik::StringUtil;
 using Bytes = std::vector<unsigned char>;
 
 Bytes ToBytes(std::string_view text) {
   return {text.begin(), text.end()};
 }
 
-TEST(Base64Test, EncodesTheTestVectorsOfRfc4648) {
+TEST(StringUtilBase64Test, EncodesTheTestVectorsOfRfc4648) {
   EXPECT_EQ(Base64Encode({}), "");
   EXPECT_EQ(Base64Encode(ToBytes("f")), "Zg==");
   EXPECT_EQ(Base64Encode(ToBytes("fo")), "Zm8=");
@@ -25,7 +30,7 @@ TEST(Base64Test, EncodesTheTestVectorsOfRfc4648) {
   EXPECT_EQ(Base64Encode(ToBytes("foobar")), "Zm9vYmFy");
 }
 
-TEST(Base64Test, DecodesWhatItEncodesAtEveryLength) {
+TEST(StringUtilBase64Test, DecodesWhatItEncodesAtEveryLength) {
   for (std::size_t length = 0; length < 200; ++length) {
     Bytes bytes(length);
     for (std::size_t i = 0; i < length; ++i) {
@@ -37,49 +42,49 @@ TEST(Base64Test, DecodesWhatItEncodesAtEveryLength) {
   }
 }
 
-TEST(Base64Test, LongInputsTakeSeveralPieces) {
+TEST(StringUtilBase64Test, DecodesInputsOfSeveralPieces) {
   Bytes bytes((std::size_t{3} << 20) * 2 + 5, 0xA7);
   Bytes decoded;
   Base64Decode(Base64Encode(bytes), decoded);
   EXPECT_EQ(decoded, bytes);
 }
 
-TEST(Base64Test, SkipsWhiteSpaceAnywhere) {
+TEST(StringUtilBase64Test, SkipsWhiteSpaceAnywhere) {
   Bytes decoded;
   Base64Decode(" Zm9v\r\n\tYm Fy ", decoded);
   EXPECT_EQ(decoded, ToBytes("foobar"));
 }
 
-TEST(Base64Test, WhiteSpaceAloneIsEmpty) {
+TEST(StringUtilBase64Test, OnlyWhiteSpaceDecodesToNothing) {
   Bytes decoded = {1};
   Base64Decode(" \n", decoded);
   EXPECT_TRUE(decoded.empty());
 }
 
-class Base64RefusalTest : public ::testing::TestWithParam<std::string> {};
+class StringUtilBase64RefusalTest : public testing::TestWithParam<std::string> {};
 
-TEST_P(Base64RefusalTest, LeavesTheOutputAlone) {
+TEST_P(StringUtilBase64RefusalTest, LeavesTheOutputUnchanged) {
   Bytes decoded = {9};
   EXPECT_THROW(Base64Decode(GetParam(), decoded), Base64FormatException);
   EXPECT_EQ(decoded, Bytes{9});
 }
 
-INSTANTIATE_TEST_SUITE_P(Texts, Base64RefusalTest,
-                         ::testing::Values("Z", "Zg", "Zg=", "Zg===", "=", "====", "Zm9v=", "Zm=v",
-                                           "Z===", "Zh==", "Zm9=", "Zm9-", "Zm9_", "Zm9v\x80",
-                                           std::string("Zm9\0", 4), "Zg==Zg==", "Zm9v!", "Zm9v\v"));
+INSTANTIATE_TEST_SUITE_P(Texts, StringUtilBase64RefusalTest,
+                         testing::Values("Z", "Zg", "Zg=", "Zg===", "=", "====", "Zm9v=", "Zm=v",
+                                         "Z===", "Zh==", "Zm9=", "Zm9-", "Zm9_", "Zm9v\x80",
+                                         std::string("Zm9\0", 4), "Zg==Zg==", "Zm9v!", "Zm9v\v"));
 
-TEST(GenerateUuidTest, GivesRandomVersion4Texts) {
+TEST(GenerateUuidTest, ReturnsRandomUuidsOfVersion4) {
   std::set<std::string> seen;
   for (int i = 0; i < 1000; ++i) {
     const std::string uuid = GenerateUuid();
-    EXPECT_THAT(uuid, ::testing::MatchesRegex("[0-9a-f]{8}-[0-9a-f]{4}-4[0-9a-f]{3}-"
-                                              "[89ab][0-9a-f]{3}-[0-9a-f]{12}"));
+    EXPECT_THAT(uuid, testing::MatchesRegex("[0-9a-f]{8}-[0-9a-f]{4}-4[0-9a-f]{3}-"
+                                            "[89ab][0-9a-f]{3}-[0-9a-f]{12}"));
     EXPECT_TRUE(seen.insert(uuid).second);
   }
 }
 
-TEST(ToLowerTest, ChangesAsciiLettersAlone) {
+TEST(ToLowerTest, ChangesOnlyAsciiLetters) {
   EXPECT_EQ(ToLower("AbZ[@`\xC3\x84 09"), "abz[@`\xC3\x84 09");
 }
 
@@ -110,4 +115,4 @@ TEST(CleanseTest, OverwritesShortAndLongTexts) {
 }
 
 }  // namespace
-}  // namespace Tarnik::StringUtil
+}  // namespace Tarnik::Testing

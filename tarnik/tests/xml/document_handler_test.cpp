@@ -1,29 +1,23 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-
-#include <string>
-
+#include <tarnik/core/exception.h>
 #include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/document.h>
-#include <tarnik/xml/xml_parse_exception.h>
+#include <tarnik/xml/element_node.h>
 #include <tarnik/xml/xml_parser.h>
+
+#include <cstddef>
+#include <string>
+#include <vector>
 
 #include "support/libxml2_oracle.h"
 #include "support/xml_text.h"
+#include "xml/parse_fault.h"
 
-namespace Tarnik::Xml {
+namespace Tarnik::Testing {
 namespace {
 
-using TestSupport::ParseXml;
-
-std::string Fault(const std::string& text) {
-  try {
-    ParseXml(text);
-  } catch (const XMLParseException& exception) {
-    return exception.Message();
-  }
-  return "";
-}
+using namespace Tarnik::Xml;
 
 TEST(DocumentHandlerTest, BuildsNodesInDocumentOrder) {
   const Ref<Document> document =
@@ -59,7 +53,7 @@ TEST(DocumentHandlerTest, BuildsNodesInDocumentOrder) {
   EXPECT_EQ(node->NextSibling(), nullptr);
 }
 
-TEST(DocumentHandlerTest, JoinsAdjacentCharacterDataAndCdataToOneText) {
+TEST(DocumentHandlerTest, JoinsAdjacentCharacterDataAndCDataIntoOneText) {
   const Ref<Document> document = ParseXml("<r>a&amp;b\r\n<![CDATA[<c>]]>&#x20AC;<![CDATA[]]>d</r>");
   const Node* text = document->RootElement()->FirstChild();
   ASSERT_EQ(text->Kind(), NodeKind::kText);
@@ -78,7 +72,7 @@ bool FirstTextHasCDataSection(const std::string& xml) {
   return static_cast<const TextNode*>(text)->HasCDataSection();
 }
 
-TEST(DocumentHandlerTest, TellsTextsThatHaveACDataSection) {
+TEST(DocumentHandlerTest, MarksTextsThatHaveACDataSection) {
   for (const char* xml : {"<r><![CDATA[a]]></r>", "<r>a<![CDATA[b]]></r>", "<r><![CDATA[a]]>b</r>",
                           "<r>a<![CDATA[]]></r>", "<r><![CDATA[]]>a</r>"}) {
     EXPECT_TRUE(FirstTextHasCDataSection(xml)) << xml;
@@ -89,7 +83,7 @@ TEST(DocumentHandlerTest, TellsTextsThatHaveACDataSection) {
   }
 }
 
-TEST(DocumentHandlerTest, ForgetsTheCDataSectionOfATextThatIsSetAnew) {
+TEST(DocumentHandlerTest, ForgetsTheCDataSectionWhenATextIsSetAgain) {
   const Ref<Document> document = ParseXml("<r><![CDATA[a]]></r>");
   auto* text = static_cast<TextNode*>(document->RootElement()->FirstChild());
   text->SetText("b");
@@ -134,7 +128,7 @@ TEST(DocumentHandlerTest, NormalisesAttributeValuesAsXmlDoes) {
   EXPECT_EQ(document->RootElement()->FindAttribute("b"), "\t\n\r");
 }
 
-TEST(DocumentHandlerTest, KnowsThePlaceOfEachNode) {
+TEST(DocumentHandlerTest, RecordsThePositionOfEachNode) {
   const Ref<Document> document = ParseXml("<r>\n  <e/>tail<!--c-->\n</r>");
   const Node* node = document->RootElement()->FirstChild();
   EXPECT_EQ(node->Line(), 1);
@@ -148,7 +142,7 @@ TEST(DocumentHandlerTest, KnowsThePlaceOfEachNode) {
   EXPECT_EQ(node->Column(), 11);
 }
 
-TEST(DocumentHandlerTest, KeepsNamesApartThatShareASlot) {
+TEST(DocumentHandlerTest, DistinguishesNamesThatShareASlot) {
   std::string text = "<r>";
   for (int index = 0; index < 5000; ++index) {
     text += "<name" + std::to_string(index) + "/>";
@@ -164,17 +158,7 @@ TEST(DocumentHandlerTest, KeepsNamesApartThatShareASlot) {
   EXPECT_EQ(index, 5000);
 }
 
-struct NamespaceCase {
-  const char* name;
-  std::string text;
-  std::string message;
-};
-
-void PrintTo(const NamespaceCase& fault, std::ostream* stream) {
-  *stream << fault.name;
-}
-
-class NamespaceFaultTest : public testing::TestWithParam<NamespaceCase> {};
+class NamespaceFaultTest : public testing::TestWithParam<FaultCase> {};
 
 TEST_P(NamespaceFaultTest, IsRefusedWithItsMessage) {
   EXPECT_EQ(Fault(GetParam().text), GetParam().message);
@@ -188,45 +172,45 @@ constexpr const char* kXmlMessage =
 INSTANTIATE_TEST_SUITE_P(
     Names, NamespaceFaultTest,
     testing::Values(
-        NamespaceCase{"UnboundElementPrefix", "<a>\n<p:e/></a>",
-                      "The prefix 'p' is not bound to a namespace at line 2, column 1"},
-        NamespaceCase{"UnboundAttributePrefix", "<a p:x='1'/>",
-                      "The prefix 'p' is not bound to a namespace at line 1, column 1"},
-        NamespaceCase{"PrefixOutOfScope", "<a><b xmlns:p='urn:p'/><p:c/></a>",
-                      "The prefix 'p' is not bound to a namespace at line 1, column 24"},
-        NamespaceCase{"SameExpandedName", "<a xmlns:p='urn:1' xmlns:q='urn:1' p:x='1' q:x='2'/>",
-                      "Two attributes of element 'a' have the same name in one namespace at line "
-                      "1, column 1"},
-        NamespaceCase{"EmptyPrefixedDeclaration", "<a xmlns:p=''/>",
-                      "The prefix 'p' is declared as no namespace at line 1, column 1"},
-        NamespaceCase{"XmlnsDeclared", "<a xmlns:xmlns='urn:x'/>", kXmlnsMessage},
-        NamespaceCase{"XmlnsNamespaceDeclared", "<a xmlns:p='http://www.w3.org/2000/xmlns/'/>",
-                      kXmlnsMessage},
-        NamespaceCase{"XmlnsNamespaceAsDefault", "<a xmlns='http://www.w3.org/2000/xmlns/'/>",
-                      kXmlnsMessage},
-        NamespaceCase{"XmlDeclaredAsAnother", "<a xmlns:xml='urn:x'/>", kXmlMessage},
-        NamespaceCase{"XmlNamespaceForAnotherPrefix",
-                      "<a xmlns:p='http://www.w3.org/XML/1998/namespace'/>", kXmlMessage},
-        NamespaceCase{"XmlNamespaceAsDefault", "<a xmlns='http://www.w3.org/XML/1998/namespace'/>",
-                      kXmlMessage},
-        NamespaceCase{"XmlnsElement", "<xmlns:a/>",
-                      "The prefix 'xmlns' is not for elements at line 1, column 1"},
-        NamespaceCase{"TwoColons", "<a:b:c xmlns:a='urn:a'/>",
-                      "The name 'a:b:c' is not a qualified name at line 1, column 1"},
-        NamespaceCase{"LeadingColon", "<:a/>",
-                      "The name ':a' is not a qualified name at line 1, column 1"},
-        NamespaceCase{"TrailingColon", "<a: xmlns:a='urn:a'/>",
-                      "The name 'a:' is not a qualified name at line 1, column 1"},
-        NamespaceCase{"LocalStartsWithDigit", "<a:1 xmlns:a='urn:a'/>",
-                      "The name 'a:1' is not a qualified name at line 1, column 1"},
-        NamespaceCase{"ColonAttribute", "<a xmlns:='urn:a'/>",
-                      "The name 'xmlns:' is not a qualified name at line 1, column 1"},
-        NamespaceCase{"ColonInInstruction", "<a><?x:y z?></a>",
-                      "The processing instruction target 'x:y' holds a colon at line 1, column "
-                      "4"}),
+        FaultCase{"UnboundElementPrefix", "<a>\n<p:e/></a>",
+                  "The prefix 'p' is not bound to a namespace at line 2, column 1"},
+        FaultCase{"UnboundAttributePrefix", "<a p:x='1'/>",
+                  "The prefix 'p' is not bound to a namespace at line 1, column 1"},
+        FaultCase{"PrefixOutOfScope", "<a><b xmlns:p='urn:p'/><p:c/></a>",
+                  "The prefix 'p' is not bound to a namespace at line 1, column 24"},
+        FaultCase{"SameExpandedName", "<a xmlns:p='urn:1' xmlns:q='urn:1' p:x='1' q:x='2'/>",
+                  "Two attributes of element 'a' have the same name in one namespace at line "
+                  "1, column 1"},
+        FaultCase{"EmptyPrefixedDeclaration", "<a xmlns:p=''/>",
+                  "The prefix 'p' is declared as no namespace at line 1, column 1"},
+        FaultCase{"XmlnsDeclared", "<a xmlns:xmlns='urn:x'/>", kXmlnsMessage},
+        FaultCase{"XmlnsNamespaceDeclared", "<a xmlns:p='http://www.w3.org/2000/xmlns/'/>",
+                  kXmlnsMessage},
+        FaultCase{"XmlnsNamespaceAsDefault", "<a xmlns='http://www.w3.org/2000/xmlns/'/>",
+                  kXmlnsMessage},
+        FaultCase{"XmlDeclaredAsAnother", "<a xmlns:xml='urn:x'/>", kXmlMessage},
+        FaultCase{"XmlNamespaceForAnotherPrefix",
+                  "<a xmlns:p='http://www.w3.org/XML/1998/namespace'/>", kXmlMessage},
+        FaultCase{"XmlNamespaceAsDefault", "<a xmlns='http://www.w3.org/XML/1998/namespace'/>",
+                  kXmlMessage},
+        FaultCase{"XmlnsElement", "<xmlns:a/>",
+                  "The prefix 'xmlns' is not for elements at line 1, column 1"},
+        FaultCase{"TwoColons", "<a:b:c xmlns:a='urn:a'/>",
+                  "The name 'a:b:c' is not a qualified name at line 1, column 1"},
+        FaultCase{"LeadingColon", "<:a/>",
+                  "The name ':a' is not a qualified name at line 1, column 1"},
+        FaultCase{"TrailingColon", "<a: xmlns:a='urn:a'/>",
+                  "The name 'a:' is not a qualified name at line 1, column 1"},
+        FaultCase{"LocalStartsWithDigit", "<a:1 xmlns:a='urn:a'/>",
+                  "The name 'a:1' is not a qualified name at line 1, column 1"},
+        FaultCase{"ColonAttribute", "<a xmlns:='urn:a'/>",
+                  "The name 'xmlns:' is not a qualified name at line 1, column 1"},
+        FaultCase{"ColonInInstruction", "<a><?x:y z?></a>",
+                  "The processing instruction target 'x:y' holds a colon at line 1, column "
+                  "4"}),
     [](const auto& test) { return test.param.name; });
 
-// Each would be refused if a rule above reached too far.
+// Each would be refused if one of the rules above were too strict.
 TEST(DocumentHandlerTest, AcceptsWhatNamespacesAllow) {
   for (const char* text :
        {"<a xmlns:p='urn:1' xmlns:q='urn:2' p:x='1' q:x='2' x='3'/>",
@@ -235,7 +219,7 @@ TEST(DocumentHandlerTest, AcceptsWhatNamespacesAllow) {
         "<a xmlns='urn:a'><b xmlns=''/></a>", "<xmlns/>", "<a xmlns:xmlfoo='urn:x'/>",
         "<a xmlns:p='urn:1'><p:b xmlns:p='urn:2' p:x=''/><p:c/></a>"}) {
     EXPECT_EQ(Fault(text), "") << text;
-    EXPECT_TRUE(TestSupport::IsWellFormedForLibXml2(text)) << text;
+    EXPECT_TRUE(IsWellFormedForLibXml2(text)) << text;
   }
 }
 
@@ -256,7 +240,7 @@ std::string Attributes(std::size_t count) {
   return text;
 }
 
-TEST(DocumentHandlerTest, HoldsTheLimitOfOpenAttributes) {
+TEST(DocumentHandlerTest, EnforcesTheLimitOfOpenAttributes) {
   const std::string half = Attributes(kMaxOpenAttributes / 2);
   EXPECT_EQ(Fault("<a" + half + "><b" + half + "/>\n<b" + half + "/></a>"), "");
   constexpr const char* kMessage = "An element and those around it have more than 1024 attributes ";
@@ -266,7 +250,7 @@ TEST(DocumentHandlerTest, HoldsTheLimitOfOpenAttributes) {
   EXPECT_EQ(Fault("<a" + Attributes(100000) + "/>"), std::string(kMessage) + "at line 1, column 1");
 }
 
-TEST(DocumentHandlerTest, IsUsedOnce) {
+TEST(DocumentHandlerTest, CanBeUsedOnlyOnce) {
   const Ref<XMLHandler> handler = CreateXMLDocumentHandler();
   handler->StartElement({1, 1}, "a", nullptr, 0);
   handler->EndElement({1, 1});
@@ -275,7 +259,7 @@ TEST(DocumentHandlerTest, IsUsedOnce) {
   EXPECT_THROW(handler->EndDocument(), InvalidStateException);
 }
 
-TEST(DocumentHandlerTest, RefusesEventsOutOfPlace) {
+TEST(DocumentHandlerTest, RefusesEventsOutOfOrder) {
   const Ref<XMLHandler> handler = CreateXMLDocumentHandler();
   EXPECT_THROW(handler->EndElement({1, 1}), InvalidStateException);
   EXPECT_THROW(handler->Characters({1, 1}, "x"), InvalidStateException);
@@ -285,4 +269,4 @@ TEST(DocumentHandlerTest, RefusesEventsOutOfPlace) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml
+}  // namespace Tarnik::Testing

@@ -2,13 +2,16 @@
 
 #include <gtest/gtest.h>
 
+#include <cstddef>
 #include <cstdint>
 #include <cstring>
 #include <string>
 #include <vector>
 
-namespace Tarnik::Xml {
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Xml;
 
 const XML_Memory_Handling_Suite& Suite() {
   return ExpatMemory::Suite();
@@ -16,7 +19,7 @@ const XML_Memory_Handling_Suite& Suite() {
 
 class ExpatMemoryTest : public testing::TestWithParam<std::size_t> {};
 
-TEST_P(ExpatMemoryTest, GivesAlignedPiecesThatDoNotOverlap) {
+TEST_P(ExpatMemoryTest, AllocatesAlignedPiecesThatDoNotOverlap) {
   ExpatMemory memory;
   const ExpatMemory::Scope scope(memory);
   std::vector<unsigned char*> pieces;
@@ -63,10 +66,10 @@ TEST(ExpatMemoryScopeTest, AllocatesFromTheInnermostScope) {
     const ExpatMemory::Scope innerScope(inner);
     ASSERT_NE(Suite().malloc_fcn(16), nullptr);
   }
-  // The next piece of the outer memory stands right behind its first one.
+  // The next piece of the outer memory directly follows its first one.
   auto* second = static_cast<char*>(Suite().malloc_fcn(16));
   EXPECT_EQ(second - first, 32);
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml
+}  // namespace Tarnik::Testing

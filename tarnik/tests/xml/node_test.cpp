@@ -2,26 +2,26 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-
-#include <functional>
-#include <string>
-#include <thread>
-#include <utility>
-#include <vector>
-
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
 
+#include <cstddef>
+#include <functional>
+#include <string>
+#include <string_view>
+#include <thread>
+#include <vector>
+
+#include "support/thrown_message.h"
 #include "support/xml_text.h"
-#include "xml/tree.h"
 
-namespace Tarnik::Xml {
+namespace Tarnik::Testing {
 namespace {
 
-using TestSupport::ParseXml;
-using TestSupport::XmlText;
+using namespace Tarnik::Xml;
 
 Ref<ElementNode> NewElement(std::string_view name) {
   Ref<ElementNode> element;
@@ -37,16 +37,11 @@ Ref<TextNode> NewText(std::string_view value) {
 }
 
 std::string ArgumentFault(const std::function<void()>& action) {
-  try {
-    action();
-  } catch (const InvalidArgumentException& exception) {
-    return exception.Message();
-  }
-  return "";
+  return ThrownMessage<InvalidArgumentException>(action, "");
 }
 
 TEST(NodeTest, StaysSmall) {
-  // A token and its tree share a budget of four times the text.
+  // The memory of a token and its tree is limited to four times the text.
   EXPECT_LE(sizeof(ElementNode), 88U);
   EXPECT_LE(sizeof(TextNode), 56U);
   EXPECT_LE(sizeof(Attribute), 24U);
@@ -104,7 +99,7 @@ TEST(NodeTest, RemovesChildren) {
   EXPECT_EQ(XmlText(root), "<r><a/></r>");
 }
 
-TEST(NodeTest, RefusesToBeAppendedWrongly) {
+TEST(NodeTest, RefusesChildrenInTheWrongPlace) {
   const Ref<Document> document = ParseXml("<r><a><b/></a></r>");
   ElementNode* root = document->RootElement();
   ElementNode* a = root->FirstChildElement("a");
@@ -127,7 +122,7 @@ TEST(NodeTest, RefusesToBeAppendedWrongly) {
   EXPECT_EQ(XmlText(other.get()), "<o/>");
 }
 
-TEST(NodeTest, GivesADocumentItsRootBack) {
+TEST(NodeTest, DocumentAcceptsItsOwnRootAgain) {
   const Ref<Document> document = ParseXml("<!--c--><r/>");
   const Ref<ElementNode> root(document->RootElement());
   document->AppendChild(root.get());
@@ -162,7 +157,7 @@ TEST(NodeTest, SharesOneCountAfterAppending) {
 }
 
 TEST(NodeTest, JoinsManyTreesInAnyOrder) {
-  // Pairs, pairs of pairs and so on, then changes through nodes of every former tree.
+  // Joins pairs, then pairs of pairs and so on, and changes every node afterwards.
   std::vector<Ref<ElementNode>> nodes;
   for (int index = 0; index < 64; ++index) {
     nodes.push_back(NewElement("n" + std::to_string(index)));
@@ -188,7 +183,7 @@ TEST(NodeTest, JoinsManyTreesInAnyOrder) {
   EXPECT_EQ(last->FindAttribute("i"), std::string(100, 'v') + "17");
 }
 
-TEST(NodeTest, DiesWithoutRecursionHoweverDeep) {
+TEST(NodeTest, IsDestroyedWithoutRecursionAtAnyDepth) {
   constexpr int kDepth = 100000;
   Ref<ElementNode> top = NewElement("e");
   for (int level = 1; level < kDepth; ++level) {
@@ -223,7 +218,7 @@ TEST(NodeTest, DescribesItselfWithoutContent) {
   EXPECT_EQ(node->NextSibling()->NextSibling()->ToString(), "<ProcessingInstructionNode>");
 }
 
-TEST(NodeTest, IsCastByItsClass) {
+TEST(NodeTest, IsCastToItsClassOnly) {
   const Ref<Document> document = ParseXml("<r>t</r>");
   Node* text = document->RootElement()->FirstChild();
   EXPECT_EQ(CheckedCast<TextNode>(text)->Text(), "t");
@@ -231,13 +226,13 @@ TEST(NodeTest, IsCastByItsClass) {
   EXPECT_THROW(CheckedCast<Document>(static_cast<Object*>(text)), TypeMismatchException);
 }
 
-TEST(NodeTest, IsReadAndCountedFromManyThreads) {
+TEST(NodeTest, IsReadAndReferencedFromManyThreads) {
   std::string source = "<r xmlns:p='urn:p'>";
   for (int index = 0; index < 50; ++index) {
     source += "<p:e i='" + std::to_string(index) + "'>text</p:e>";
   }
   Ref<Document> document = ParseXml(source + "</r>");
-  // References through a former tree of their own, too.
+  // Some references go through a node that had its own tree before.
   const Ref<ElementNode> added = NewElement("added");
   document->RootElement()->AppendChild(added.get());
   const std::string expected = XmlText(document.get());
@@ -262,7 +257,7 @@ TEST(NodeTest, IsReadAndCountedFromManyThreads) {
   EXPECT_EQ(document->RefCount(), 2);
 }
 
-TEST(TextNodeTest, IsMadeEmpty) {
+TEST(TextNodeTest, IsCreatedEmpty) {
   Ref<TextNode> text;
   CreateTextNode(text);
   EXPECT_EQ(text->Kind(), NodeKind::kText);
@@ -270,7 +265,7 @@ TEST(TextNodeTest, IsMadeEmpty) {
   EXPECT_EQ(text->Parent(), nullptr);
 }
 
-TEST(TextNodeTest, RefusesWhatXmlCannotCarryAndNamesTheElement) {
+TEST(TextNodeTest, RefusesWhatXmlDoesNotAllowAndNamesTheElement) {
   constexpr const char* kRest =
       " holds what XML cannot carry: a control character or bytes that are not UTF-8.";
   const Ref<TextNode> text = NewText("before");
@@ -292,26 +287,5 @@ TEST(TextNodeTest, MayBeSetFromItsOwnText) {
   EXPECT_EQ(text->Text(), "text");
 }
 
-TEST(TreeTest, GivesMemoryThatIsAligned) {
-  const Tree::Holder tree = Tree::Create(Tree::kNodeBlockBytes);
-  for (int round = 0; round < 500; ++round) {
-    tree->Allocate<char>(static_cast<std::size_t>(round % 7 + 1));
-    EXPECT_EQ(reinterpret_cast<std::uintptr_t>(tree->Allocate<void*>()) % alignof(void*), 0U);
-  }
-}
-
-TEST(TreeTest, KeepsTextsOfEverySize) {
-  const Tree::Holder tree = Tree::Create(Tree::kNodeBlockBytes);
-  std::vector<std::string_view> stored;
-  for (std::size_t size = 0; size < 5000; size += 37) {
-    stored.push_back(tree->Store(std::string(size, static_cast<char>('a' + size % 26))));
-  }
-  stored.push_back(tree->Store(std::string(1 << 20, 'z')));
-  for (const std::string_view text : stored) {
-    EXPECT_EQ(text.find_first_not_of(text.empty() ? ' ' : text.front()), std::string_view::npos);
-  }
-  EXPECT_EQ(stored.back().size(), std::size_t{1} << 20);
-}
-
 }  // namespace
-}  // namespace Tarnik::Xml
+}  // namespace Tarnik::Testing

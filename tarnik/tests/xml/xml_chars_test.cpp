@@ -3,12 +3,16 @@
 #include <gtest/gtest.h>
 #include <libxml/chvalid.h>
 
+#include <cstddef>
+#include <ios>
 #include <string>
 
-namespace Tarnik::Xml {
+namespace Tarnik::Testing {
 namespace {
 
-// Any number of up to 21 bits in the form of UTF-8 with this many octets, whether or not it may be.
+using namespace Tarnik::Xml;
+
+// Encodes any number of up to 21 bits as UTF-8 with this many octets, even where that is not valid.
 std::string Encoded(unsigned character, int octets) {
   if (octets == 1) {
     return {static_cast<char>(character)};
@@ -26,14 +30,14 @@ int OctetsOf(unsigned character) {
   return character < 0x80 ? 1 : character < 0x800 ? 2 : character < 0x10000 ? 3 : 4;
 }
 
-TEST(XmlCharsTest, TextsHoldTheCharactersOfXmlAndNoOthers) {
+TEST(XmlCharsTest, AcceptsExactlyTheCharactersOfXml) {
   for (unsigned character = 0; character <= 0x110FFF; ++character) {
     const std::string text = Encoded(character, OctetsOf(character));
     ASSERT_EQ(IsXmlText("a" + text + "b"), xmlIsCharQ(character) != 0) << std::hex << character;
   }
 }
 
-TEST(XmlCharsTest, AnOctetCountsWhereverItStands) {
+TEST(XmlCharsTest, ChecksEveryOctetAtEveryPosition) {
   constexpr std::size_t kLength = 27;
   for (int octet = 0; octet <= 0xFF; ++octet) {
     const bool isText = octet < 0x80 && xmlIsCharQ(static_cast<unsigned>(octet)) != 0;
@@ -45,7 +49,7 @@ TEST(XmlCharsTest, AnOctetCountsWhereverItStands) {
   }
 }
 
-TEST(XmlCharsTest, LongTextsMayHoldOtherCharactersAnywhere) {
+TEST(XmlCharsTest, AcceptsLongCharactersAnywhereInLongTexts) {
   constexpr std::size_t kLength = 27;
   for (std::size_t position = 0; position <= kLength; ++position) {
     std::string text(kLength, '~');
@@ -53,7 +57,7 @@ TEST(XmlCharsTest, LongTextsMayHoldOtherCharactersAnywhere) {
   }
 }
 
-TEST(XmlCharsTest, OverlongFormsAreNoText) {
+TEST(XmlCharsTest, RefusesOverlongForms) {
   for (unsigned character = 0; character < 0x10000; ++character) {
     for (int octets = OctetsOf(character) + 1; octets <= 4; ++octets) {
       ASSERT_FALSE(IsXmlText(Encoded(character, octets))) << std::hex << character;
@@ -61,7 +65,7 @@ TEST(XmlCharsTest, OverlongFormsAreNoText) {
   }
 }
 
-TEST(XmlCharsTest, BrokenSequencesAreNoText) {
+TEST(XmlCharsTest, RefusesBrokenSequences) {
   for (const char* text : {"\x80", "\xBF", "\xC3", "\xC3(", "\xE2\x82", "\xE2\x82(", "\xE2(\xA1",
                            "\xF0\x9F\x94", "\xF0\x9F\x94(", "\xF8\x88\x80\x80\x80",
                            "\xFC\x84\x80\x80\x80\x80", "\xFE", "\xFF", "\xC3\xA4\xA4"}) {
@@ -72,7 +76,7 @@ TEST(XmlCharsTest, BrokenSequencesAreNoText) {
   EXPECT_TRUE(IsXmlText("\xC3\xA4\xE2\x82\xAC\xF0\x9F\x94\x91"));
 }
 
-TEST(XmlCharsTest, NamesWithoutColonBeginWithALetter) {
+TEST(XmlCharsTest, NCNamesBeginWithALetterOrAnUnderscore) {
   for (const char* name : {"a", "_", "Z9", "a-b.c", "\xC3\xA4", "a\xC2\xB7", "\xF0\x90\x80\x80"}) {
     EXPECT_TRUE(IsNCName(name)) << name;
   }
@@ -82,7 +86,7 @@ TEST(XmlCharsTest, NamesWithoutColonBeginWithALetter) {
   }
 }
 
-TEST(XmlCharsTest, QualifiedNamesHaveOneColonAtMost) {
+TEST(XmlCharsTest, QualifiedNamesHaveAtMostOneColon) {
   for (const char* name : {"a", "a:b", "_:_"}) {
     EXPECT_TRUE(IsQualifiedName(name)) << name;
   }
@@ -92,4 +96,4 @@ TEST(XmlCharsTest, QualifiedNamesHaveOneColonAtMost) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml
+}  // namespace Tarnik::Testing

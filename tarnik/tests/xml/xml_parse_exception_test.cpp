@@ -4,10 +4,12 @@
 
 #include <memory>
 
-namespace Tarnik::Xml {
+namespace Tarnik::Testing {
 namespace {
 
-TEST(XMLParseExceptionTest, SaysWhatAndWhere) {
+using namespace Tarnik::Xml;
+
+TEST(XMLParseExceptionTest, ContainsTheFaultAndItsPosition) {
   const XMLParseException exception("mismatched tag", {12, 7});
   EXPECT_EQ(exception.Message(), "mismatched tag at line 12, column 7");
   EXPECT_STREQ(exception.what(), "mismatched tag at line 12, column 7");
@@ -28,4 +30,4 @@ TEST(XMLParseExceptionTest, KeepsItsClassWhenThrownFromAClone) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml
+}  // namespace Tarnik::Testing

@@ -1,22 +1,25 @@
 #include <tarnik/xml/xml_writer.h>
 
 #include <gtest/gtest.h>
-
-#include <string>
-
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/core/writer.h>
 #include <tarnik/xml/character_nodes.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
+
+#include <cstddef>
+#include <string>
+#include <string_view>
 
 #include "support/random_xml.h"
 #include "support/xml_text.h"
 #include "xml/security/c14n.h"
 
-namespace Tarnik::Xml {
+namespace Tarnik::Testing {
 namespace {
 
-using TestSupport::ParseXml;
-using TestSupport::XmlText;
+using namespace Tarnik::Xml;
 
 TEST(XmlWriterTest, WritesEveryKindOfNode) {
   const std::string text =
@@ -26,7 +29,7 @@ TEST(XmlWriterTest, WritesEveryKindOfNode) {
   EXPECT_EQ(XmlText(ParseXml(text).get()), text);
 }
 
-TEST(XmlWriterTest, WritesASubtreeWithWhatStandsInIt) {
+TEST(XmlWriterTest, WritesASubtreeWithItsContent) {
   const Ref<Document> document = ParseXml("<r xmlns:p='urn:p'><p:a><b/>t</p:a><c/></r>");
   const ElementNode* a = document->RootElement()->FirstChildElement("a");
   EXPECT_EQ(XmlText(a), "<p:a><b/>t</p:a>");
@@ -46,7 +49,7 @@ TEST(XmlWriterTest, EscapesTextAndAttributes) {
             "<e a=\"&amp;&lt;>&quot;'&#x9;&#xA;&#xD;\">&amp;&lt;&gt;\"'\t\n&#xD;]]&gt;</e>");
 }
 
-// Markup at every offset, so that no block of the search for it is left out.
+// Markup at every offset, so that every part of the search for it is covered.
 TEST(XmlWriterTest, EscapesAtEveryOffset) {
   for (std::size_t length = 0; length < 70; ++length) {
     for (std::size_t offset = 0; offset <= length; ++offset) {
@@ -71,9 +74,9 @@ TEST(XmlWriterTest, WritesTextsLongerThanItsBuffer) {
   EXPECT_EQ(XmlText(ParseXml(text).get()), text);
 }
 
-TEST(XmlWriterTest, IsReadBackAsTheSameTree) {
+TEST(XmlWriterTest, WritesWhatParsesToTheSameTree) {
   for (unsigned seed = 0; seed < 300; ++seed) {
-    TestSupport::RandomXml random(seed);
+    RandomXml random(seed);
     const Ref<Document> document = ParseXml(random.Document());
     const std::string written = XmlText(document.get());
     const Ref<Document> again = ParseXml(written);
@@ -94,7 +97,7 @@ TEST(XmlWriterTest, RefusesNull) {
   EXPECT_THROW(WriteXml(ParseXml("<a/>").get(), nullptr), InvalidArgumentException);
 }
 
-TEST(XmlWriterTest, PassesTheFailureOfTheWriterThrough) {
+TEST(XmlWriterTest, PropagatesTheFailureOfTheWriter) {
   class FailingWriter final : public Writer, public ObjectImpl {
    public:
     void Write(std::string_view) override { throw IOException("full"); }
@@ -104,4 +107,4 @@ TEST(XmlWriterTest, PassesTheFailureOfTheWriterThrough) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml
+}  // namespace Tarnik::Testing

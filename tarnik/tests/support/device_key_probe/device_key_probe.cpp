@@ -1,5 +1,5 @@
-// Signs with a key of a TPM and verifies that. Usage: device_key_probe URI METHOD [PIN]
-// A program of its own, since a provider that is loaded serves the whole process.
+// Signs with a key of a TPM and verifies the signature. Usage: device_key_probe URI METHOD [PIN]
+// A separate program, since a loaded provider serves the whole process.
 #include <openssl/provider.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
@@ -8,6 +8,7 @@
 
 #include <iostream>
 #include <string>
+#include <utility>
 
 namespace {
 

@@ -1,12 +1,12 @@
-// Ends the process while the pool has work under way. Usage: exit_probe SCENARIO
+// Ends the process while the pool still has work. Usage: exit_probe SCENARIO
 #include <openssl/evp.h>
 #include <openssl/rsa.h>
 #include <tarnik/system/tcp_client_socket.h>
 #include <tarnik/system/thread_pool.h>
 
 #include <atomic>
+#include <chrono>
 #include <cstdlib>
-#include <cstring>
 #include <future>
 #include <iostream>
 #include <map>
@@ -84,7 +84,7 @@ void RunItemsThatWaitForTimers() {
   AwaitStarted(kItems / 2);
 }
 
-void PostCompletionsWithoutEnd() {
+void PostEndlessCompletions() {
   struct Repeat {
     void operator()() const {
       ++started;
@@ -97,7 +97,7 @@ void PostCompletionsWithoutEnd() {
   AwaitStarted(100);
 }
 
-void LeaveConnectsUnderWay() {
+void LeaveConnectsPending() {
   for (int i = 0; i < kItems; ++i) {
     const auto socket = Tarnik::System::CreateTCPClientSocket(GetThreadPool().get());
     socket->ConnectAsync(i % 2 == 0 ? "localhost" : "127.0.0.1", 1,
@@ -125,8 +125,8 @@ int main(int argumentCount, char** arguments) {
       {"blocked", RunBlockedItems},
       {"openssl", RunOpenSslItems},
       {"timers", RunItemsThatWaitForTimers},
-      {"completions", PostCompletionsWithoutEnd},
-      {"connects", LeaveConnectsUnderWay},
+      {"completions", PostEndlessCompletions},
+      {"connects", LeaveConnectsPending},
       {"exit-from-worker", ExitFromAWorker},
       {"exit-from-io", ExitFromAnIoThread},
       {"unused", [] {}},

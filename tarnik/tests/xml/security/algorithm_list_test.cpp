@@ -3,89 +3,85 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "support/signed_documents.h"
+#include <string>
 
-namespace Tarnik::Xml::Security {
+#include "support/algorithm_uris.h"
+#include "support/signed_documents.h"
+#include "support/xml_text.h"
+
+namespace Tarnik::Testing {
 namespace {
 
-using Tests::AssertionWith;
-using Tests::AssertionWithValues;
-using Tests::Judge;
-using Tests::Replaced;
-using Tests::SignatureTemplate;
-using Tests::Signed;
-using Tests::Transforms;
+using namespace Tarnik::Xml;
+using namespace Tarnik::Xml::Security;
 
-constexpr const char* kEnveloped = "http://www.w3.org/2000/09/xmldsig#enveloped-signature";
-constexpr const char* kExclusive = "http://www.w3.org/2001/10/xml-exc-c14n#";
-constexpr const char* kInclusive = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315";
+// Everything else in these documents is supported: without the change they are only "invalid", as
+// AlgorithmParametersTest shows.
+class UnlistedSignatureMethodTest : public testing::TestWithParam<const char*> {};
 
-// Every other slot of the same document is right, as the first case of each list shows.
-class UnlistedSignatureMethod : public ::testing::TestWithParam<const char*> {};
-
-TEST_P(UnlistedSignatureMethod, IsRefused) {
+TEST_P(UnlistedSignatureMethodTest, IsRefused) {
   SignatureTemplate signature;
   signature.signatureMethod = GetParam();
-  EXPECT_EQ(Judge(AssertionWithValues(signature)),
+  EXPECT_EQ(Verdict(AssertionWithValues(signature)),
             std::string("refused: The signature algorithm '") + GetParam() + "' is not supported.");
 }
 
-INSTANTIATE_TEST_SUITE_P(Uris, UnlistedSignatureMethod,
-                         ::testing::Values("", "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256 ",
-                                           " http://www.w3.org/2001/04/xmldsig-more#rsa-sha256",
-                                           "http://www.w3.org/2001/04/xmldsig-more#RSA-SHA256",
-                                           "http://www.w3.org/2001/04/xmldsig-more#rsa-sha",
-                                           "http://www.w3.org/2001/04/xmldsig-more#rsa-sha2567",
-                                           "https://www.w3.org/2001/04/xmldsig-more#rsa-sha256",
-                                           "http://www.w3.org/2000/09/xmldsig#rsa-sha1",
-                                           "http://www.w3.org/2000/09/xmldsig#dsa-sha1",
-                                           "http://www.w3.org/2000/09/xmldsig#hmac-sha1",
-                                           "http://www.w3.org/2001/04/xmldsig-more#hmac-sha256",
-                                           "http://www.w3.org/2001/04/xmldsig-more#rsa-md5",
-                                           "http://www.w3.org/2001/04/xmldsig-more#rsa-sha224",
-                                           "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha1",
-                                           "http://www.w3.org/2007/05/xmldsig-more#sha1-rsa-MGF1",
-                                           "http://www.w3.org/2007/05/xmldsig-more#rsa-pss",
-                                           "http://www.w3.org/2001/04/xmlenc#sha256"));
+INSTANTIATE_TEST_SUITE_P(Uris, UnlistedSignatureMethodTest,
+                         testing::Values("", "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256 ",
+                                         " http://www.w3.org/2001/04/xmldsig-more#rsa-sha256",
+                                         "http://www.w3.org/2001/04/xmldsig-more#RSA-SHA256",
+                                         "http://www.w3.org/2001/04/xmldsig-more#rsa-sha",
+                                         "http://www.w3.org/2001/04/xmldsig-more#rsa-sha2567",
+                                         "https://www.w3.org/2001/04/xmldsig-more#rsa-sha256",
+                                         "http://www.w3.org/2000/09/xmldsig#rsa-sha1",
+                                         "http://www.w3.org/2000/09/xmldsig#dsa-sha1",
+                                         "http://www.w3.org/2000/09/xmldsig#hmac-sha1",
+                                         "http://www.w3.org/2001/04/xmldsig-more#hmac-sha256",
+                                         "http://www.w3.org/2001/04/xmldsig-more#rsa-md5",
+                                         "http://www.w3.org/2001/04/xmldsig-more#rsa-sha224",
+                                         "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha1",
+                                         "http://www.w3.org/2007/05/xmldsig-more#sha1-rsa-MGF1",
+                                         "http://www.w3.org/2007/05/xmldsig-more#rsa-pss",
+                                         "http://www.w3.org/2001/04/xmlenc#sha256"));
 
-class UnlistedDigestMethod : public ::testing::TestWithParam<const char*> {};
+class UnlistedDigestMethodTest : public testing::TestWithParam<const char*> {};
 
-TEST_P(UnlistedDigestMethod, IsRefused) {
+TEST_P(UnlistedDigestMethodTest, IsRefused) {
   SignatureTemplate signature;
   signature.digestMethod = GetParam();
-  EXPECT_EQ(Judge(AssertionWithValues(signature)),
+  EXPECT_EQ(Verdict(AssertionWithValues(signature)),
             std::string("refused: The digest algorithm '") + GetParam() + "' is not supported.");
 }
 
-INSTANTIATE_TEST_SUITE_P(Uris, UnlistedDigestMethod,
-                         ::testing::Values("", "http://www.w3.org/2001/04/xmlenc#sha256 ",
-                                           "http://www.w3.org/2001/04/xmlenc#SHA256",
-                                           "http://www.w3.org/2001/04/xmlenc#sha384",
-                                           "http://www.w3.org/2000/09/xmldsig#sha1",
-                                           "http://www.w3.org/2001/04/xmldsig-more#md5",
-                                           "http://www.w3.org/2001/04/xmldsig-more#sha224",
-                                           "http://www.w3.org/2001/04/xmlenc#ripemd160"));
+INSTANTIATE_TEST_SUITE_P(Uris, UnlistedDigestMethodTest,
+                         testing::Values("", "http://www.w3.org/2001/04/xmlenc#sha256 ",
+                                         "http://www.w3.org/2001/04/xmlenc#SHA256",
+                                         "http://www.w3.org/2001/04/xmlenc#sha384",
+                                         "http://www.w3.org/2000/09/xmldsig#sha1",
+                                         "http://www.w3.org/2001/04/xmldsig-more#md5",
+                                         "http://www.w3.org/2001/04/xmldsig-more#sha224",
+                                         "http://www.w3.org/2001/04/xmlenc#ripemd160"));
 
-class UnlistedCanonicalization : public ::testing::TestWithParam<const char*> {};
+class UnlistedCanonicalizationTest : public testing::TestWithParam<const char*> {};
 
-TEST_P(UnlistedCanonicalization, IsRefused) {
+TEST_P(UnlistedCanonicalizationTest, IsRefused) {
   SignatureTemplate signature;
   signature.canonicalization = GetParam();
-  EXPECT_EQ(Judge(AssertionWithValues(signature)),
+  EXPECT_EQ(Verdict(AssertionWithValues(signature)),
             std::string("refused: The canonicalisation algorithm '") + GetParam() +
                 "' is not supported.");
 }
 
-TEST_P(UnlistedCanonicalization, IsRefusedAsTransform) {
+TEST_P(UnlistedCanonicalizationTest, IsRefusedAsTransform) {
   SignatureTemplate signature;
   signature.transforms = Transforms({kEnveloped, GetParam()});
-  EXPECT_EQ(Judge(AssertionWithValues(signature)),
+  EXPECT_EQ(Verdict(AssertionWithValues(signature)),
             std::string("refused: The transform algorithm '") + GetParam() + "' is not supported.");
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Uris, UnlistedCanonicalization,
-    ::testing::Values(
+    Uris, UnlistedCanonicalizationTest,
+    testing::Values(
         "", "http://www.w3.org/2001/10/xml-exc-c14n", "http://www.w3.org/2001/10/xml-exc-c14n# ",
         "http://www.w3.org/2001/10/xml-exc-c14n#withcomments",
         "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#withComments",
@@ -94,26 +90,26 @@ INSTANTIATE_TEST_SUITE_P(
         "http://www.w3.org/TR/1999/REC-xpath-19991116", "http://www.w3.org/2002/06/xmldsig-filter2",
         "http://www.w3.org/2000/09/xmldsig#enveloped-signature"));
 
-TEST(TransformList, IsLimitedToItsSaneForms) {
+TEST(TransformListTest, AcceptsOnlyTheSupportedCombinations) {
   SignatureTemplate signature;
   signature.transforms = Transforms({kEnveloped, kExclusive});
-  EXPECT_EQ(Judge(Signed({}, AssertionWith(signature.Text()))), "valid");
+  EXPECT_EQ(Verdict(Signed({}, AssertionWith(signature.Text()))), "valid");
   signature.transforms = Transforms({kEnveloped});
-  EXPECT_EQ(Judge(Signed({}, AssertionWith(signature.Text()))), "valid");
+  EXPECT_EQ(Verdict(Signed({}, AssertionWith(signature.Text()))), "valid");
 
   signature.transforms = Transforms({kEnveloped, kExclusive, kExclusive});
-  EXPECT_EQ(Judge(AssertionWithValues(signature)),
+  EXPECT_EQ(Verdict(AssertionWithValues(signature)),
             "refused: The transform algorithm 'http://www.w3.org/2001/10/xml-exc-c14n#' is not "
             "supported after a canonicalisation.");
   signature.transforms = Transforms({kExclusive, kEnveloped});
-  EXPECT_EQ(Judge(AssertionWithValues(signature)),
+  EXPECT_EQ(Verdict(AssertionWithValues(signature)),
             "refused: The transform algorithm "
             "'http://www.w3.org/2000/09/xmldsig#enveloped-signature' is not supported after a "
             "canonicalisation.");
 }
 
-// Both are right in the eyes of the oracle, so that only the list can be the reason.
-TEST(TransformList, RefusesRightSignaturesOverXPath) {
+// The oracle accepts the signature, so that only the list of algorithms can be the reason.
+TEST(TransformListTest, RefusesCorrectSignaturesOverXPath) {
   SignatureTemplate signature;
   signature.transforms =
       "<ds:Transforms><ds:Transform "
@@ -121,69 +117,70 @@ TEST(TransformList, RefusesRightSignaturesOverXPath) {
       "Algorithm=\"http://www.w3.org/TR/1999/REC-xpath-19991116\"><ds:XPath>true()</ds:XPath>"
       "</ds:Transform></ds:Transforms>";
   const std::string text = Signed({}, AssertionWith(signature.Text()));
-  EXPECT_EQ(Judge(text),
+  EXPECT_EQ(Verdict(text),
             "refused: The transform algorithm 'http://www.w3.org/TR/1999/REC-xpath-19991116' is "
             "not supported.");
 }
 
-TEST(AlgorithmList, RefusesRightSignaturesWithSha1) {
+TEST(AlgorithmListTest, RefusesCorrectSignaturesWithSha1) {
   DevSts::SignOptions options;
   options.digest = DevSts::DigestAlgorithm::Sha1;
-  EXPECT_EQ(Judge(Signed(options)),
+  EXPECT_EQ(Verdict(Signed(options)),
             "refused: The digest algorithm 'http://www.w3.org/2000/09/xmldsig#sha1' is not "
             "supported.");
   options.digest = DevSts::DigestAlgorithm::Sha256;
-  EXPECT_EQ(Judge(Signed(options)), "valid");
+  EXPECT_EQ(Verdict(Signed(options)), "valid");
   options.signature = DevSts::SignatureAlgorithm::RsaSha1;
-  EXPECT_EQ(Judge(Signed(options)),
+  EXPECT_EQ(Verdict(Signed(options)),
             "refused: The signature algorithm 'http://www.w3.org/2000/09/xmldsig#rsa-sha1' is not "
             "supported.");
 }
 
-// The URI with the bare number sign means the same form; the oracle knows the one without.
-TEST(AlgorithmList, TakesTheInclusiveFormWithANumberSign) {
+// The URI with a trailing number sign means the same method; the oracle knows only the one without.
+TEST(AlgorithmListTest, AcceptsTheInclusiveMethodWithANumberSign) {
   SignatureTemplate signature;
   signature.canonicalization = kInclusive;
   signature.transforms = Transforms({kEnveloped, kInclusive});
-  EXPECT_EQ(Judge(Signed({}, AssertionWith(signature.Text()))), "valid");
+  EXPECT_EQ(Verdict(Signed({}, AssertionWith(signature.Text()))), "valid");
   const std::string text =
       Signed({}, AssertionWith(Replaced(signature.Text(), Transforms({kEnveloped, kInclusive}),
                                         Transforms({kEnveloped, kExclusive}))));
-  EXPECT_EQ(Judge(text), "valid");
+  EXPECT_EQ(Verdict(text), "valid");
   signature.canonicalization = kExclusive;
   const std::string inclusive = Signed({}, AssertionWith(signature.Text()));
-  EXPECT_EQ(Judge(Tests::Resigned(
-                Replaced(inclusive, "REC-xml-c14n-20010315\"", "REC-xml-c14n-20010315#\""))),
-            "valid");
+  EXPECT_EQ(
+      Verdict(Resigned(Replaced(inclusive, "REC-xml-c14n-20010315\"", "REC-xml-c14n-20010315#\""))),
+      "valid");
 }
 
-TEST(AlgorithmList, EveryListIsJudgedBeforeAnyKeyIsAskedFor) {
+TEST(AlgorithmListTest, ChecksEveryListBeforeAnyKeyIsRequested) {
   SignatureTemplate signature;
   signature.moreReferences =
       "<ds:Reference URI=\"#_a1\">" + Transforms({"urn:unknown"}) +
       "<ds:DigestMethod Algorithm=\"http://www.w3.org/2001/04/xmlenc#sha256\"/>"
       "<ds:DigestValue>AAAA</ds:DigestValue></ds:Reference>";
-  EXPECT_EQ(Judge(AssertionWithValues(signature), Tests::Stranger()),
+  EXPECT_EQ(Verdict(AssertionWithValues(signature), Stranger()),
             "refused: The transform algorithm 'urn:unknown' is not supported.");
 }
 
-TEST(AlgorithmParameters, AreRefusedWhereNoneBelong) {
+TEST(AlgorithmParametersTest, AreRefusedWhereNoneAreAllowed) {
   const std::string text = AssertionWithValues({});
-  ASSERT_EQ(Judge(text), "invalid");
-  EXPECT_EQ(Judge(Replaced(text, "rsa-sha256\"/>",
-                           "rsa-sha256\"><ds:HMACOutputLength>8</ds:HMACOutputLength>"
-                           "</ds:SignatureMethod>")),
+  ASSERT_EQ(Verdict(text), "invalid");
+  EXPECT_EQ(Verdict(Replaced(text, "rsa-sha256\"/>",
+                             "rsa-sha256\"><ds:HMACOutputLength>8</ds:HMACOutputLength>"
+                             "</ds:SignatureMethod>")),
             "refused: The algorithm 'http://www.w3.org/2001/04/xmldsig-more#rsa-sha256' takes no "
             "parameters, but has 'ds:HMACOutputLength'.");
-  EXPECT_EQ(Judge(Replaced(text, "xmlenc#sha256\"/>", "xmlenc#sha256\"><x/></ds:DigestMethod>")),
+  EXPECT_EQ(Verdict(Replaced(text, "xmlenc#sha256\"/>", "xmlenc#sha256\"><x/></ds:DigestMethod>")),
             "refused: The algorithm 'http://www.w3.org/2001/04/xmlenc#sha256' takes no "
             "parameters, but has 'x'.");
   EXPECT_EQ(
-      Judge(Replaced(text, "enveloped-signature\"/>", "enveloped-signature\"><x/></ds:Transform>")),
+      Verdict(
+          Replaced(text, "enveloped-signature\"/>", "enveloped-signature\"><x/></ds:Transform>")),
       "refused: The algorithm 'http://www.w3.org/2000/09/xmldsig#enveloped-signature' takes no "
       "parameters, but has 'x'.");
-  EXPECT_EQ(Judge(Replaced(text, "xml-exc-c14n#\"/></ds:Transforms>",
-                           "xml-exc-c14n#\"><ds:XPath/></ds:Transform></ds:Transforms>")),
+  EXPECT_EQ(Verdict(Replaced(text, "xml-exc-c14n#\"/></ds:Transforms>",
+                             "xml-exc-c14n#\"><ds:XPath/></ds:Transform></ds:Transforms>")),
             "refused: The algorithm 'http://www.w3.org/2001/10/xml-exc-c14n#' does not take "
             "'ds:XPath' as a parameter.");
 }
@@ -193,35 +190,35 @@ std::string WithPrefixList(const std::string& list) {
                   "xml-exc-c14n#\">" + list + "</ds:Transform></ds:Transforms>");
 }
 
-TEST(AlgorithmParameters, OfTheExclusiveFormAreOnePrefixList) {
+TEST(AlgorithmParametersTest, OfTheExclusiveMethodAreOnePrefixList) {
   const std::string list =
       "<c:InclusiveNamespaces xmlns:c=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>";
-  EXPECT_EQ(Judge(WithPrefixList(list)), "invalid");
-  EXPECT_EQ(Judge(WithPrefixList(list + list)),
+  EXPECT_EQ(Verdict(WithPrefixList(list)), "invalid");
+  EXPECT_EQ(Verdict(WithPrefixList(list + list)),
             "refused: Element 'ds:Transform' holds the unexpected element "
             "'c:InclusiveNamespaces'.");
-  EXPECT_EQ(Judge(WithPrefixList(Replaced(list, "/>", " Prefix=\"\"/>"))),
+  EXPECT_EQ(Verdict(WithPrefixList(Replaced(list, "/>", " Prefix=\"\"/>"))),
             "refused: Element 'c:InclusiveNamespaces' has the unexpected attribute 'Prefix'.");
-  EXPECT_EQ(Judge(WithPrefixList(Replaced(list, "/>", "><x/></c:InclusiveNamespaces>"))),
+  EXPECT_EQ(Verdict(WithPrefixList(Replaced(list, "/>", "><x/></c:InclusiveNamespaces>"))),
             "refused: Element 'c:InclusiveNamespaces' holds the unexpected element 'x'.");
 }
 
-TEST(AlgorithmParameters, PrefixListsAreSplitAtWhiteSpace) {
-  const auto document = Tests::ParseDocument(
+TEST(AlgorithmParametersTest, PrefixListsAreSplitAtWhiteSpace) {
+  const auto document = ParseXml(
       "<t><i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2001/10/xml-exc-c14n#\" "
       "PrefixList=\"  a&#10;b&#9;#default  c \"/></t>");
   const C14nOptions options = LookUpCanonicalizationMethod(kExclusive, document->RootElement());
   EXPECT_TRUE(options.exclusive);
-  EXPECT_THAT(options.inclusivePrefixes, ::testing::ElementsAre("a", "b", "#default", "c"));
+  EXPECT_THAT(options.inclusivePrefixes, testing::ElementsAre("a", "b", "#default", "c"));
 }
 
-TEST(AlgorithmList, BoundsAndCleansWhatItQuotes) {
+TEST(AlgorithmListTest, BoundsAndSanitisesWhatItQuotes) {
   SignatureTemplate signature;
   signature.signatureMethod = "\xC3\xA4&#9;" + std::string(100'000, 'x');
-  const std::string judgement = Judge(AssertionWithValues(signature));
-  EXPECT_THAT(judgement, ::testing::StartsWith("refused: The signature algorithm '???xxx"));
-  EXPECT_LT(judgement.size(), 250U);
+  const std::string verdict = Verdict(AssertionWithValues(signature));
+  EXPECT_THAT(verdict, testing::StartsWith("refused: The signature algorithm '???xxx"));
+  EXPECT_LT(verdict.size(), 250U);
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace Tarnik::Testing

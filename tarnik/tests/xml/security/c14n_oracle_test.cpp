@@ -1,6 +1,9 @@
 #include "xml/security/c14n.h"
 
 #include <gtest/gtest.h>
+#include <tarnik/core/writer.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
 
 #include <optional>
 #include <string>
@@ -10,13 +13,11 @@
 #include "support/random_xml.h"
 #include "support/xml_text.h"
 
-namespace Tarnik::Xml::Security {
+namespace Tarnik::Testing {
 namespace {
 
-using TestSupport::CanonicalizeWithLibXml2;
-using TestSupport::OracleRequest;
-using TestSupport::ParseXml;
-using TestSupport::RandomXml;
+using namespace Tarnik::Xml;
+using namespace Tarnik::Xml::Security;
 
 const Node* NextNode(const Node* node) {
   if (node->Kind() == NodeKind::kElement) {
@@ -91,4 +92,4 @@ TEST_P(C14nOracleTest, AgreesWithLibXml2OnGeneratedDocuments) {
 INSTANTIATE_TEST_SUITE_P(Seeds, C14nOracleTest, testing::Range(0U, 10U));
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace Tarnik::Testing

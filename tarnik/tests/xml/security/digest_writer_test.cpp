@@ -2,8 +2,16 @@
 
 #include <gtest/gtest.h>
 
-namespace Tarnik::Xml::Security {
+#include <cstddef>
+#include <string>
+
+#include "support/algorithm_uris.h"
+
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Xml;
+using namespace Tarnik::Xml::Security;
 
 std::string Hex(const Digest& digest) {
   static constexpr char kDigits[] = "0123456789abcdef";
@@ -15,8 +23,8 @@ std::string Hex(const Digest& digest) {
   return text;
 }
 
-// FIPS 180-4's example "abc".
-TEST(DigestWriter, HashesWhatIsWritten) {
+// The message "abc" is the example of FIPS 180-4.
+TEST(DigestWriterTest, HashesWhatIsWritten) {
   DigestWriter writer;
   writer.Start(Crypto::Hash::kSha256);
   writer.Write("a");
@@ -36,7 +44,7 @@ TEST(DigestWriter, HashesWhatIsWritten) {
             "2192992a274fc1a836ba3c23a3feebbd454d4423643ce80e2a9ac94fa54ca49f");
 }
 
-TEST(DigestWriter, ForgetsADigestThatWasNotFinished) {
+TEST(DigestWriterTest, DiscardsADigestThatWasNotFinished) {
   DigestWriter writer;
   writer.Start(Crypto::Hash::kSha256);
   writer.Write("left over");
@@ -46,4 +54,4 @@ TEST(DigestWriter, ForgetsADigestThatWasNotFinished) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace Tarnik::Testing

@@ -2,32 +2,32 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <tarnik/xml/security/xml_security_exception.h>
 
-#include "support/signed_documents.h"
+#include <string>
 
-namespace Tarnik::Xml::Security {
+#include "support/thrown_message.h"
+#include "support/xml_text.h"
+
+namespace Tarnik::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using namespace Tarnik::Xml;
+using namespace Tarnik::Xml::Security;
+using testing::ElementsAre;
+using testing::IsEmpty;
 
 KeyInfo Read(const std::string& content, const std::string& attributes = "") {
-  const auto document =
-      Tests::ParseDocument("<KeyInfo xmlns=\"http://www.w3.org/2000/09/xmldsig#\"" + attributes +
-                           ">" + content + "</KeyInfo>");
+  const auto document = ParseXml("<KeyInfo xmlns=\"http://www.w3.org/2000/09/xmldsig#\"" +
+                                 attributes + ">" + content + "</KeyInfo>");
   return ReadKeyInfo(document->RootElement());
 }
 
 std::string ReadError(const std::string& content, const std::string& attributes = "") {
-  try {
-    Read(content, attributes);
-  } catch (const SignatureSyntaxException& error) {
-    return error.Message();
-  }
-  return "accepted";
+  return ThrownMessage<SignatureSyntaxException>([&] { Read(content, attributes); }, "accepted");
 }
 
-TEST(KeyInfoReader, ReadsEveryX509Hint) {
+TEST(KeyInfoReaderTest, ReadsEveryX509Hint) {
   const KeyInfo keyInfo = Read(
       "<KeyName> name </KeyName>"
       "<X509Data><X509IssuerSerial><X509IssuerName>CN=a</X509IssuerName>\n"
@@ -46,7 +46,7 @@ TEST(KeyInfoReader, ReadsEveryX509Hint) {
   EXPECT_EQ(keyInfo.element->LocalName(), "KeyInfo");
 }
 
-TEST(KeyInfoReader, PassesOverWhatIsNoX509Hint) {
+TEST(KeyInfoReaderTest, SkipsWhatIsNotAnX509Hint) {
   const KeyInfo keyInfo = Read(
       "<KeyValue><RSAKeyValue><Modulus></Modulus></RSAKeyValue></KeyValue><PGPData/><SPKIData/>"
       "<MgmtData>x</MgmtData><o:Other xmlns:o=\"urn:other\">text</o:Other>"
@@ -64,15 +64,15 @@ struct Case {
   const char* message;
 };
 
-class KeyInfoSyntax : public ::testing::TestWithParam<Case> {};
+class KeyInfoSyntaxTest : public testing::TestWithParam<Case> {};
 
-TEST_P(KeyInfoSyntax, IsRefused) {
+TEST_P(KeyInfoSyntaxTest, IsRefused) {
   EXPECT_EQ(ReadError(GetParam().content), GetParam().message);
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Cases, KeyInfoSyntax,
-    ::testing::Values(
+    Cases, KeyInfoSyntaxTest,
+    testing::Values(
         Case{"Empty", " ", "Element 'KeyInfo' is empty."},
         Case{"Text", "x<KeyName/>", "Element 'KeyInfo' holds text between its elements."},
         Case{"RetrievalMethod", "<RetrievalMethod URI=\"file:///etc/passwd\"/>",
@@ -104,11 +104,11 @@ INSTANTIATE_TEST_SUITE_P(
              "Element 'X509Certificate' has the unexpected attribute 'Id'."}),
     [](const auto& tested) { return tested.param.name; });
 
-TEST(KeyInfoReader, RefusesUnknownAttributes) {
+TEST(KeyInfoReaderTest, RefusesUnknownAttributes) {
   EXPECT_EQ(ReadError("<KeyName/>", " Type=\"x\""),
             "Element 'KeyInfo' has the unexpected attribute 'Type'.");
   EXPECT_EQ(ReadError("<KeyName/>"), "accepted");
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace Tarnik::Testing

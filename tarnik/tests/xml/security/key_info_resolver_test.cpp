@@ -1,24 +1,29 @@
 #include <tarnik/xml/security/key_info_resolver.h>
 
 #include <gtest/gtest.h>
-
 #include <tarnik/core/exception.h>
 
+#include <cstddef>
+#include <utility>
+#include <vector>
+
+#include "support/openssl.h"
 #include "support/test_certificates.h"
 
-namespace Tarnik::Xml::Security {
+namespace Tarnik::Testing {
 namespace {
 
+using namespace Tarnik::Xml;
+using namespace Tarnik::Xml::Security;
 using Crypto::Certificate;
-using Tests::MakeCertificate;
 
-class Resolvers : public ::testing::Test {
+class Resolvers : public testing::Test {
  protected:
   static std::vector<unsigned char> DerOf(const Ref<const Certificate>& certificate) {
     return {certificate->DerBytes(), certificate->DerBytes() + certificate->DerLength()};
   }
 
-  const OpenSsl::OwnedKey otherKey_ = Tests::MakeEcKey("P-256");
+  const OpenSsl::OwnedKey otherKey_ = MakeEcKey("P-256");
   const Ref<const Certificate> first_ = MakeCertificate(
       {.commonName = "first", .issuerCommonName = "ca", .serial = "1", .withKeyIdentifier = true});
   const Ref<const Certificate> second_ = MakeCertificate({.key = otherKey_.get(),
@@ -32,12 +37,12 @@ class Resolvers : public ::testing::Test {
                                                             .serial = "3"});
 };
 
-class TrustedCertificatesResolver : public Resolvers {
+class TrustedCertificatesResolverTest : public Resolvers {
  protected:
   const Ref<const KeyInfoResolver> resolver_ = CreateTrustedCertificatesResolver({first_, second_});
 };
 
-TEST_F(TrustedCertificatesResolver, FindsACarriedCertificateByItsBytes) {
+TEST_F(TrustedCertificatesResolverTest, FindsAnEmbeddedCertificateByItsBytes) {
   KeyInfo keyInfo;
   keyInfo.certificates = {DerOf(second_)};
   EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
@@ -45,7 +50,7 @@ TEST_F(TrustedCertificatesResolver, FindsACarriedCertificateByItsBytes) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
 }
 
-TEST_F(TrustedCertificatesResolver, TrustsNoCertificateThatDiffersInOneByte) {
+TEST_F(TrustedCertificatesResolverTest, TrustsNoCertificateThatDiffersInOneByte) {
   KeyInfo keyInfo;
   keyInfo.certificates = {DerOf(first_)};
   for (const std::size_t place : {std::size_t{0}, DerOf(first_).size() - 1}) {
@@ -60,7 +65,7 @@ TEST_F(TrustedCertificatesResolver, TrustsNoCertificateThatDiffersInOneByte) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
-TEST_F(TrustedCertificatesResolver, LooksAtNoOtherHintBesideACertificate) {
+TEST_F(TrustedCertificatesResolverTest, IgnoresOtherHintsNextToACertificate) {
   KeyInfo keyInfo;
   keyInfo.subjectNames = {first_->SubjectName()};
   EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
@@ -68,7 +73,7 @@ TEST_F(TrustedCertificatesResolver, LooksAtNoOtherHintBesideACertificate) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
-TEST_F(TrustedCertificatesResolver, FindsByIssuerAndSerialNumber) {
+TEST_F(TrustedCertificatesResolverTest, FindsByIssuerAndSerialNumber) {
   KeyInfo keyInfo;
   keyInfo.issuerSerials = {{"CN = ca, O=Test\\, Inc.", "002"}};
   EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
@@ -78,7 +83,7 @@ TEST_F(TrustedCertificatesResolver, FindsByIssuerAndSerialNumber) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
-TEST_F(TrustedCertificatesResolver, FindsBySubjectKeyIdentifier) {
+TEST_F(TrustedCertificatesResolverTest, FindsBySubjectKeyIdentifier) {
   KeyInfo keyInfo;
   keyInfo.subjectKeyIdentifiers = {second_->SubjectKeyIdentifier()};
   EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
@@ -86,7 +91,7 @@ TEST_F(TrustedCertificatesResolver, FindsBySubjectKeyIdentifier) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
-TEST_F(TrustedCertificatesResolver, FindsBySubjectName) {
+TEST_F(TrustedCertificatesResolverTest, FindsBySubjectName) {
   KeyInfo keyInfo;
   keyInfo.subjectNames = {"CN=second, O=Test\\, Inc."};
   EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
@@ -94,7 +99,7 @@ TEST_F(TrustedCertificatesResolver, FindsBySubjectName) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
-TEST_F(TrustedCertificatesResolver, ChoosesNoneWhenAHintNamesSeveral) {
+TEST_F(TrustedCertificatesResolverTest, ReturnsNoKeyWhenAHintNamesSeveralCertificates) {
   KeyInfo keyInfo;
   keyInfo.subjectNames = {first_->SubjectName(), second_->SubjectName()};
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
@@ -102,7 +107,7 @@ TEST_F(TrustedCertificatesResolver, ChoosesNoneWhenAHintNamesSeveral) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
 }
 
-TEST_F(TrustedCertificatesResolver, NeedsNoHintWhenOneCertificateIsTrusted) {
+TEST_F(TrustedCertificatesResolverTest, NeedsNoHintWhenOnlyOneCertificateIsTrusted) {
   KeyInfo keyInfo;
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
   const auto single = CreateTrustedCertificatesResolver({first_});
@@ -111,24 +116,24 @@ TEST_F(TrustedCertificatesResolver, NeedsNoHintWhenOneCertificateIsTrusted) {
   EXPECT_EQ(single->Resolve(keyInfo), first_->GetPublicKey());
 }
 
-TEST_F(TrustedCertificatesResolver, SurvivesBrokenCertificates) {
+TEST_F(TrustedCertificatesResolverTest, IgnoresBrokenCertificates) {
   KeyInfo keyInfo;
   keyInfo.certificates = {{1, 2, 3}};
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
-class CertificateIssuerResolver : public Resolvers {
+class CertificateIssuerResolverTest : public Resolvers {
  protected:
   const Ref<const KeyInfoResolver> resolver_ = CreateCertificateIssuerResolver({first_, second_});
 };
 
-TEST_F(CertificateIssuerResolver, FindsByTheIssuerThatIsNamed) {
+TEST_F(CertificateIssuerResolverTest, FindsByTheIssuerThatIsNamed) {
   KeyInfo keyInfo;
   keyInfo.issuerSerials = {{second_->IssuerName(), "2"}};
   EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
 }
 
-TEST_F(CertificateIssuerResolver, FindsByTheIssuerOfACarriedCertificate) {
+TEST_F(CertificateIssuerResolverTest, FindsByTheIssuerOfAnEmbeddedCertificate) {
   KeyInfo keyInfo;
   keyInfo.certificates = {DerOf(first_)};
   EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
@@ -136,7 +141,7 @@ TEST_F(CertificateIssuerResolver, FindsByTheIssuerOfACarriedCertificate) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
-TEST_F(CertificateIssuerResolver, GivesTheTrustedKeyWhenAStrangerCarriesItsIssuer) {
+TEST_F(CertificateIssuerResolverTest, ReturnsTheTrustedKeyForAStrangerWithTheSameIssuer) {
   const auto namesake = MakeCertificate(
       {.key = otherKey_.get(), .commonName = "first", .issuerCommonName = "ca", .serial = "1"});
   KeyInfo keyInfo;
@@ -145,7 +150,7 @@ TEST_F(CertificateIssuerResolver, GivesTheTrustedKeyWhenAStrangerCarriesItsIssue
   EXPECT_NE(resolver_->Resolve(keyInfo), namesake->GetPublicKey());
 }
 
-TEST_F(CertificateIssuerResolver, RefusesASignatureThatNamesNoIssuer) {
+TEST_F(CertificateIssuerResolverTest, ReturnsNoKeyForASignatureWithoutAnIssuer) {
   KeyInfo keyInfo;
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
   EXPECT_EQ(CreateCertificateIssuerResolver({first_})->Resolve(keyInfo), nullptr);
@@ -161,7 +166,7 @@ void ExpectArgumentChecks(Create create) {
   EXPECT_THROW(create({MakeCertificate(), nullptr}), InvalidArgumentException);
 }
 
-TEST(KeyInfoResolvers, NeedCertificates) {
+TEST(KeyInfoResolverTest, RefusesMissingCertificates) {
   ExpectArgumentChecks([](std::vector<Ref<const Certificate>> certificates) {
     CreateTrustedCertificatesResolver(std::move(certificates));
   });
@@ -171,4 +176,4 @@ TEST(KeyInfoResolvers, NeedCertificates) {
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace Tarnik::Testing

@@ -1,14 +1,29 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <openssl/rsa.h>
-
 #include <tarnik/core/object_impl.h>
+#include <tarnik/crypto/private_key.h>
+#include <tarnik/crypto/public_key.h>
+#include <tarnik/text/string_util.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 
+#include <string>
+#include <tuple>
+#include <vector>
+
+#include "support/algorithm_uris.h"
 #include "support/key_texts.h"
 #include "support/new_signatures.h"
+#include "support/openssl.h"
+#include "support/signed_documents.h"
+#include "support/test_certificates.h"
+#include "support/xml_text.h"
 
-namespace Tarnik::Xml::Security {
+namespace Tarnik::Testing {
 namespace {
 
-using namespace Testing;
+using namespace Tarnik::Xml;
+using namespace Tarnik::Xml::Security;
 using Crypto::PrivateKey;
 
 struct MethodCase {
@@ -58,12 +73,12 @@ const C14nCase kCanonicalizations[] = {
     {"InclusiveWithComments", kInclusiveWithComments},
 };
 
-class NewSignatureAlgorithms
+class NewSignatureAlgorithmsTest
     : public testing::TestWithParam<std::tuple<MethodCase, DigestCase, C14nCase>> {
  protected:
-  NewSignatureAlgorithms()
-      : signer_(Tests::SignerOf(std::get<0>(GetParam()).key)),
-        stranger_(Tests::SignerOf(std::get<0>(GetParam()).key, "stranger")) {}
+  NewSignatureAlgorithmsTest()
+      : signer_(SignerOf(std::get<0>(GetParam()).key)),
+        stranger_(SignerOf(std::get<0>(GetParam()).key, "stranger")) {}
 
   std::string Sign(std::string* value = nullptr) const {
     const auto& [method, digest, c14n] = GetParam();
@@ -72,10 +87,10 @@ class NewSignatureAlgorithms
     request.Reference("#time", digest.algorithm, c14n.algorithm);
     request.Place();
     request.signature->Sign(Crypto::CreatePrivateKeyFromPem(signer_.privateKeyPem).get());
-    EXPECT_TRUE(request.signature->Verify(Tests::Trusting(signer_).get()));
-    EXPECT_FALSE(request.signature->Verify(Tests::Trusting(stranger_).get()));
+    EXPECT_TRUE(request.signature->Verify(Trusting(signer_).get()));
+    EXPECT_FALSE(request.signature->Verify(Trusting(stranger_).get()));
     if (value != nullptr) {
-      *value = TextOf(Tests::FindElement(request.document.get(), "SignatureValue"));
+      *value = XmlText(FindElement(request.document.get(), "SignatureValue"));
     }
     return request.Text();
   }
@@ -84,17 +99,16 @@ class NewSignatureAlgorithms
   const DevSts::Credential stranger_;
 };
 
-TEST_P(NewSignatureAlgorithms, AreMadeAsWeAndTheOracleVerify) {
+TEST_P(NewSignatureAlgorithmsTest, MakeSignaturesThatWeAndTheOracleVerify) {
   const std::string text = Sign();
-  EXPECT_EQ(Tests::Judge(text, signer_), "valid");
+  EXPECT_EQ(Verdict(text, signer_), "valid");
   const DevSts::VerifyResult verdict = DevSts::VerifyXml(text, signer_.certificatePem);
   EXPECT_TRUE(verdict.valid) << verdict.reason << "\n" << text;
   EXPECT_THAT(verdict.referenceUris, testing::ElementsAre("#body", "#time"));
-  EXPECT_FALSE(
-      DevSts::VerifyXml(Tests::Replaced(text, ">now<", ">later<"), signer_.certificatePem));
+  EXPECT_FALSE(DevSts::VerifyXml(Replaced(text, ">now<", ">later<"), signer_.certificatePem));
 }
 
-TEST_P(NewSignatureAlgorithms, GiveTheSameValueUnlessTheyAreRandomised) {
+TEST_P(NewSignatureAlgorithmsTest, MakeTheSameValueUnlessTheyAreRandomised) {
   std::string first;
   std::string second;
   Sign(&first);
@@ -102,7 +116,7 @@ TEST_P(NewSignatureAlgorithms, GiveTheSameValueUnlessTheyAreRandomised) {
   EXPECT_EQ(first != second, std::get<0>(GetParam()).isRandomised);
 }
 
-INSTANTIATE_TEST_SUITE_P(All, NewSignatureAlgorithms,
+INSTANTIATE_TEST_SUITE_P(All, NewSignatureAlgorithmsTest,
                          testing::Combine(testing::ValuesIn(kMethods), testing::ValuesIn(kDigests),
                                           testing::ValuesIn(kCanonicalizations)),
                          [](const auto& tested) {
@@ -120,25 +134,25 @@ OpenSsl::OwnedKey MakePssKey() {
 }
 
 Ref<const PrivateKey> Loaded(const OpenSsl::OwnedKey& key) {
-  return Crypto::CreatePrivateKeyFromPem(Tests::ToPkcs8Pem(key.get()));
+  return Crypto::CreatePrivateKeyFromPem(ToPkcs8Pem(key.get()));
 }
 
 std::string SignRefusal(const char* method, const PrivateKey* key) {
   Request request(kExclusive, method);
   request.Reference("#body");
-  const std::string blank = TextOf(request.signature->Element());
+  const std::string blank = XmlText(request.signature->Element());
   const std::string refusal = Refusal([&] { request.signature->Sign(key); });
   if (refusal != "done") {
-    EXPECT_EQ(TextOf(request.signature->Element()), blank);
+    EXPECT_EQ(XmlText(request.signature->Element()), blank);
   }
   return refusal;
 }
 
-TEST(NewSignatureKey, RefusesKeysThatDoNotFitTheAlgorithm) {
+TEST(NewSignatureKeyTest, RefusesKeysThatDoNotFitTheAlgorithm) {
   const char* const pssSha256 = "http://www.w3.org/2007/05/xmldsig-more#sha256-rsa-MGF1";
-  const auto ec = Loaded(Tests::MakeEcKey("P-256"));
+  const auto ec = Loaded(MakeEcKey("P-256"));
   const auto pss = Loaded(MakePssKey());
-  const auto edwards = Loaded(Tests::MakeKey("ED25519"));
+  const auto edwards = Loaded(MakeKey("ED25519"));
   EXPECT_EQ(SignRefusal(kRsaSha256, ec.get()),
             std::string("security: The private key is an EC key; the signature algorithm '") +
                 kRsaSha256 + "' needs an RSA key.");
@@ -158,11 +172,11 @@ TEST(NewSignatureKey, RefusesKeysThatDoNotFitTheAlgorithm) {
   EXPECT_EQ(SignRefusal(pssSha256, pss.get()), "done");
 }
 
-TEST(NewSignatureKey, RefusesWeakKeys) {
-  const auto weak = Loaded(Tests::MakeRsaKey(1024));
+TEST(NewSignatureKeyTest, RefusesWeakKeys) {
+  const auto weak = Loaded(MakeRsaKey(1024));
   EXPECT_EQ(SignRefusal(kRsaSha256, weak.get()),
             "security: The private RSA key has 1024 bits; at least 2048 are needed.");
-  const auto uncommon = Loaded(Tests::MakeEcKey("secp256k1"));
+  const auto uncommon = Loaded(MakeEcKey("secp256k1"));
   EXPECT_EQ(SignRefusal(kEcdsaSha256, uncommon.get()),
             "security: The private key is not on the curve P-256, P-384 or P-521.");
 }
@@ -173,26 +187,26 @@ class StrangeKey final : public PrivateKey, public ObjectImpl {
   bool Matches(const Crypto::Certificate&) const override { return true; }
 };
 
-TEST(NewSignatureKey, RefusesKeysOfOtherMakes) {
+TEST(NewSignatureKeyTest, RefusesKeysOfOtherImplementations) {
   EXPECT_EQ(SignRefusal(kRsaSha256, MakeRef<StrangeKey>().get()),
             "security: The private key was not made by this library.");
 }
 
-TEST(NewSignatureKey, SignsOnP521AsWeVerify) {
-  const OpenSsl::OwnedKey key = Tests::MakeEcKey("P-521");
-  Tests::CertificateRecipe recipe;
+TEST(NewSignatureKeyTest, SignsOnP521) {
+  const OpenSsl::OwnedKey key = MakeEcKey("P-521");
+  CertificateRecipe recipe;
   recipe.key = key.get();
   Request request(kExclusive, "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha512");
   request.Reference("#body");
   request.signature->Sign(Loaded(key).get());
-  EXPECT_EQ(StringUtil::Base64Encode(std::vector<unsigned char>(132)).size(),
-            Tests::Between(TextOf(request.signature->Element()), "<ds:SignatureValue>",
-                           "</ds:SignatureValue>")
-                .size());
+  EXPECT_EQ(
+      StringUtil::Base64Encode(std::vector<unsigned char>(132)).size(),
+      Between(XmlText(request.signature->Element()), "<ds:SignatureValue>", "</ds:SignatureValue>")
+          .size());
   request.Place();
   EXPECT_TRUE(request.signature->Verify(
-      CreateTrustedCertificatesResolver({Tests::MakeCertificate(recipe)}).get()));
+      CreateTrustedCertificatesResolver({MakeCertificate(recipe)}).get()));
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace Tarnik::Testing

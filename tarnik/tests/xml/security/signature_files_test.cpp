@@ -1,15 +1,22 @@
 #include <tarnik/xml/security/signature.h>
 
 #include <gtest/gtest.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/xml/security/key_info_resolver.h>
+
+#include <string>
 
 #include "support/signed_documents.h"
 
-namespace Tarnik::Xml::Security {
+namespace Tarnik::Testing {
 namespace {
+
+using namespace Tarnik::Xml;
+using namespace Tarnik::Xml::Security;
 
 struct FileCase {
   const char* file;
-  const char* judgement;
+  const char* verdict;
   const char* signer = "signer";
 };
 
@@ -58,23 +65,24 @@ const FileCase kFiles[] = {
     {"retrieval-method.xml", "syntax: Element 'ds:KeyInfo' may not hold 'ds:RetrievalMethod'."},
 };
 
-class SignatureFile : public ::testing::TestWithParam<FileCase> {};
+class SignatureFileTest : public testing::TestWithParam<FileCase> {};
 
-TEST_P(SignatureFile, IsJudgedAsItsNameSays) {
+TEST_P(SignatureFileTest, HasTheExpectedVerdict) {
   const FileCase& tested = GetParam();
   const auto resolver = CreateTrustedCertificatesResolver(Crypto::LoadCertificates(
       std::string(TARNIK_TEST_DATA) + "/signatures/" + tested.signer + ".pem"));
-  const std::string text = Tests::ReadTestData(std::string("signatures/") + tested.file);
-  EXPECT_EQ(Tests::Judge(text, resolver.get()), tested.judgement);
+  const std::string text = ReadTestData(std::string("signatures/") + tested.file);
+  EXPECT_EQ(Verdict(text, resolver.get()), tested.verdict);
 }
 
-INSTANTIATE_TEST_SUITE_P(Files, SignatureFile, ::testing::ValuesIn(kFiles), [](const auto& tested) {
-  std::string name;
-  for (const char c : std::string(tested.param.file)) {
-    name.push_back(c == '-' || c == '.' ? '_' : c);
-  }
-  return name;
-});
+INSTANTIATE_TEST_SUITE_P(Files, SignatureFileTest, testing::ValuesIn(kFiles),
+                         [](const auto& tested) {
+                           std::string name;
+                           for (const char c : std::string(tested.param.file)) {
+                             name.push_back(c == '-' || c == '.' ? '_' : c);
+                           }
+                           return name;
+                         });
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace Tarnik::Testing

@@ -3,16 +3,19 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <cstddef>
+#include <string>
+#include <string_view>
+
 #include "support/signed_documents.h"
 
-namespace Tarnik::Xml::Security {
+namespace Tarnik::Testing {
 namespace {
 
-using ::testing::HasSubstr;
-using ::testing::StartsWith;
-using Tests::Judge;
-using Tests::Replaced;
-using Tests::Signed;
+using namespace Tarnik::Xml;
+using namespace Tarnik::Xml::Security;
+using testing::HasSubstr;
+using testing::StartsWith;
 
 const std::string& Good() {
   static const std::string text = Signed();
@@ -23,8 +26,8 @@ std::string InsertedBefore(std::string_view place, std::string_view what) {
   return Replaced(Good(), place, std::string(what).append(place));
 }
 
-TEST(SignatureReader, AcceptsWhatTheOracleSigned) {
-  EXPECT_EQ(Judge(Good()), "valid");
+TEST(SignatureReaderTest, AcceptsWhatTheOracleSigned) {
+  EXPECT_EQ(Verdict(Good()), "valid");
 }
 
 struct SyntaxCase {
@@ -33,10 +36,10 @@ struct SyntaxCase {
   const char* message;
 };
 
-class SignatureSyntax : public ::testing::TestWithParam<SyntaxCase> {};
+class SignatureSyntaxTest : public testing::TestWithParam<SyntaxCase> {};
 
-TEST_P(SignatureSyntax, IsRefused) {
-  EXPECT_EQ(Judge(GetParam().make()), std::string("syntax: ") + GetParam().message);
+TEST_P(SignatureSyntaxTest, IsRefused) {
+  EXPECT_EQ(Verdict(GetParam().make()), std::string("syntax: ") + GetParam().message);
 }
 
 std::string Inside(std::string_view element, std::string_view content) {
@@ -61,12 +64,13 @@ std::string Twice(std::string_view element) {
   return text.insert(start, copy);
 }
 
-// The good document with the whole value in a CDATA section, which its canonical form ignores.
+// The good document with the whole value in a CDATA section, which does not change its canonical
+// form.
 std::string InCData(const std::string& localName) {
   const std::string open = "<ds:" + localName + ">";
   const std::string close = "</ds:" + localName + ">";
-  const std::string value = Tests::Between(Good(), open, close);
-  return Tests::ReplacedBetween(Good(), open, close, "<![CDATA[" + value + "]]>");
+  const std::string value = Between(Good(), open, close);
+  return ReplacedBetween(Good(), open, close, "<![CDATA[" + value + "]]>");
 }
 
 const SyntaxCase kCases[] = {
@@ -117,15 +121,16 @@ const SyntaxCase kCases[] = {
     {"NoSignatureValue", [] { return Without("SignatureValue"); },
      "Element 'ds:Signature' holds 'ds:KeyInfo' where 'SignatureValue' of XML-Signature is "
      "expected."},
-    {"SignedInfoInObjectInFront",
+    {"SignedInfoInObjectAtTheStart",
      [] {
        const std::string info =
-           Tests::Between(Good(), "<ds:Signature xmlns:ds=\"http://www.w3.org/2000/09/xmldsig#\">",
-                          "<ds:SignatureValue>");
+           Between(Good(), "<ds:Signature xmlns:ds=\"http://www.w3.org/2000/09/xmldsig#\">",
+                   "<ds:SignatureValue>");
        return InsertedBefore("<ds:SignedInfo>", "<ds:Object>" + info + "</ds:Object>");
      },
      "Element 'ds:Signature' holds 'ds:Object' where 'SignedInfo' of XML-Signature is expected."},
-    {"ObjectBehind", [] { return Inside("Signature>", "<ds:Object><ds:SignedInfo/></ds:Object>"); },
+    {"ObjectAtTheEnd",
+     [] { return Inside("Signature>", "<ds:Object><ds:SignedInfo/></ds:Object>"); },
      "Element 'ds:Signature' holds the unexpected element 'ds:Object'."},
     {"SignatureMethodInObject",
      [] {
@@ -135,15 +140,13 @@ const SyntaxCase kCases[] = {
      "Element 'ds:SignedInfo' holds 'ds:Object' where 'SignatureMethod' of XML-Signature is "
      "expected."},
     {"EmptySignatureValue",
-     [] {
-       return Tests::ReplacedBetween(Good(), "<ds:SignatureValue>", "</ds:SignatureValue>", " ");
-     },
+     [] { return ReplacedBetween(Good(), "<ds:SignatureValue>", "</ds:SignatureValue>", " "); },
      "Element 'ds:SignatureValue' is empty."},
     {"EmptyDigestValue",
-     [] { return Tests::ReplacedBetween(Good(), "<ds:DigestValue>", "</ds:DigestValue>", ""); },
+     [] { return ReplacedBetween(Good(), "<ds:DigestValue>", "</ds:DigestValue>", ""); },
      "Element 'ds:DigestValue' is empty."},
     {"BrokenBase64InDigestValue",
-     [] { return Tests::ReplacedBetween(Good(), "<ds:DigestValue>", "</ds:DigestValue>", "A-=="); },
+     [] { return ReplacedBetween(Good(), "<ds:DigestValue>", "</ds:DigestValue>", "A-=="); },
      "Element 'ds:DigestValue' does not hold Base64."},
     {"BrokenBase64InSignatureValue", [] { return Inside("SignatureValue", "*"); },
      "Element 'ds:SignatureValue' does not hold Base64."},
@@ -169,43 +172,42 @@ const SyntaxCase kCases[] = {
      [] { return Replaced(Good(), "http://www.w3.org/2000/09/xmldsig#\"", "urn:other\""); },
      "Element 'ds:Signature' is not the Signature of XML-Signature."},
     {"EmptyTransforms",
-     [] { return Tests::ReplacedBetween(Good(), "<ds:Transforms>", "</ds:Transforms>", ""); },
+     [] { return ReplacedBetween(Good(), "<ds:Transforms>", "</ds:Transforms>", ""); },
      "Element 'ds:Transforms' ends where 'Transform' of XML-Signature is expected."},
 };
 
-INSTANTIATE_TEST_SUITE_P(Cases, SignatureSyntax, ::testing::ValuesIn(kCases),
+INSTANTIATE_TEST_SUITE_P(Cases, SignatureSyntaxTest, testing::ValuesIn(kCases),
                          [](const auto& tested) { return tested.param.name; });
 
-TEST(SignatureReader, AcceptsWhiteSpaceInValuesAndBetweenElements) {
-  EXPECT_EQ(Judge(Inside("SignatureValue", "\n\t ")), "valid");
-  EXPECT_EQ(Judge(Inside("X509Certificate", "\r\n ")), "valid");
-  EXPECT_EQ(Judge(InsertedBefore("<ds:SignatureValue>", "\n  ")), "valid");
-  EXPECT_EQ(Judge(InsertedBefore("<ds:SignatureValue>", "<!-- value follows -->")), "valid");
+TEST(SignatureReaderTest, AcceptsWhiteSpaceInValuesAndBetweenElements) {
+  EXPECT_EQ(Verdict(Inside("SignatureValue", "\n\t ")), "valid");
+  EXPECT_EQ(Verdict(Inside("X509Certificate", "\r\n ")), "valid");
+  EXPECT_EQ(Verdict(InsertedBefore("<ds:SignatureValue>", "\n  ")), "valid");
+  EXPECT_EQ(Verdict(InsertedBefore("<ds:SignatureValue>", "<!-- value follows -->")), "valid");
 }
 
-// The values are what they were: only the way that they are written is refused above.
-TEST(SignatureReader, AcceptsCDataSectionsWithoutAValue) {
-  EXPECT_EQ(Judge(InsertedBefore("<ds:SignatureValue>", "<![CDATA[ ]]>")), "valid");
-  EXPECT_EQ(Judge(InsertedBefore("<ds:SignatureValue>", "<![CDATA[]]>")), "valid");
+// Above, only CDATA sections in values are refused.
+TEST(SignatureReaderTest, AcceptsCDataSectionsOutsideValues) {
+  EXPECT_EQ(Verdict(InsertedBefore("<ds:SignatureValue>", "<![CDATA[ ]]>")), "valid");
+  EXPECT_EQ(Verdict(InsertedBefore("<ds:SignatureValue>", "<![CDATA[]]>")), "valid");
 }
 
-// White space in SignedInfo is signed: it may stand there, but not be put there.
-TEST(SignatureReader, AcceptsWhiteSpaceInSignedInfoThatIsSigned) {
+// White space in SignedInfo is signed: it is allowed, but must not be added later.
+TEST(SignatureReaderTest, AcceptsWhiteSpaceInSignedInfoThatIsSigned) {
   const std::string spaced = Inside("DigestValue", "\n\t ");
-  EXPECT_EQ(Judge(spaced), "invalid");
-  EXPECT_EQ(Judge(Tests::Resigned(spaced)), "valid");
+  EXPECT_EQ(Verdict(spaced), "invalid");
+  EXPECT_EQ(Verdict(Resigned(spaced)), "valid");
 }
 
-TEST(SignatureReader, AcceptsIdsAndNamespaceDeclarations) {
-  EXPECT_EQ(Judge(Replaced(Good(), "<ds:SignatureValue",
-                           "<ds:SignatureValue Id=\"v\" xmlns:x=\"urn:x\"")),
+TEST(SignatureReaderTest, AcceptsIdsAndNamespaceDeclarations) {
+  EXPECT_EQ(Verdict(Replaced(Good(), "<ds:SignatureValue",
+                             "<ds:SignatureValue Id=\"v\" xmlns:x=\"urn:x\"")),
             "valid");
 }
 
 std::string WithReferences(std::size_t count) {
-  const std::string reference = "<ds:Reference" +
-                                Tests::Between(Good(), "<ds:Reference", "</ds:Reference>") +
-                                "</ds:Reference>";
+  const std::string reference =
+      "<ds:Reference" + Between(Good(), "<ds:Reference", "</ds:Reference>") + "</ds:Reference>";
   std::string references;
   references.reserve(reference.size() * count);
   for (std::size_t i = 0; i < count; ++i) {
@@ -214,21 +216,21 @@ std::string WithReferences(std::size_t count) {
   return Replaced(Good(), reference, references);
 }
 
-TEST(SignatureReader, BoundsTheNumberOfReferences) {
-  EXPECT_EQ(Judge(Tests::Resigned(WithReferences(kMaxReferences))), "valid");
-  EXPECT_EQ(Judge(WithReferences(kMaxReferences + 1)),
+TEST(SignatureReaderTest, LimitsTheNumberOfReferences) {
+  EXPECT_EQ(Verdict(Resigned(WithReferences(kMaxReferences))), "valid");
+  EXPECT_EQ(Verdict(WithReferences(kMaxReferences + 1)),
             "syntax: A signature may have no more than 16 references.");
-  EXPECT_EQ(Judge(WithReferences(20'000)),
+  EXPECT_EQ(Verdict(WithReferences(20'000)),
             "syntax: A signature may have no more than 16 references.");
 }
 
-TEST(SignatureReader, BoundsWhatItQuotes) {
+TEST(SignatureReaderTest, BoundsWhatItQuotes) {
   const std::string name(5000, 'x');
-  const std::string judgement = Judge(InsertedBefore("<ds:SignedInfo>", "<" + name + "/>"));
-  EXPECT_THAT(judgement, StartsWith("syntax: "));
-  EXPECT_THAT(judgement, HasSubstr(std::string(120, 'x') + "...'"));
-  EXPECT_LT(judgement.size(), 300U);
+  const std::string verdict = Verdict(InsertedBefore("<ds:SignedInfo>", "<" + name + "/>"));
+  EXPECT_THAT(verdict, StartsWith("syntax: "));
+  EXPECT_THAT(verdict, HasSubstr(std::string(120, 'x') + "...'"));
+  EXPECT_LT(verdict.size(), 300U);
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace Tarnik::Testing

@@ -2,7 +2,6 @@
 #include <signal.h>
 #include <spawn.h>
 #include <sys/wait.h>
-#include <tarnik/system/thread_pool.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -12,11 +11,11 @@
 
 extern char** environ;
 
-namespace Tarnik::System {
+namespace Tarnik::Testing {
 namespace {
 
 constexpr std::chrono::seconds kExitLimit{30};
-// ThreadSanitizer sleeps a second at each exit.
+// ThreadSanitizer sleeps for a second at each exit.
 #ifdef __SANITIZE_THREAD__
 constexpr int kRepetitions = 3;
 #else
@@ -25,7 +24,7 @@ constexpr int kRepetitions = 20;
 constexpr int kHung = -1;
 constexpr int kNotStarted = -2;
 
-// The exit status of the probe, or 128 and the number of the signal that has ended it.
+// The exit status of the probe, or 128 plus the number of the signal that has ended it.
 int RunProbe(const std::string& scenario) {
   std::string program = TARNIK_EXIT_PROBE;
   std::string argument = scenario;
@@ -47,9 +46,9 @@ int RunProbe(const std::string& scenario) {
   return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
 }
 
-class ThreadPoolExit : public testing::TestWithParam<const char*> {};
+class ThreadPoolExitTest : public testing::TestWithParam<const char*> {};
 
-TEST_P(ThreadPoolExit, NeitherCrashesNorHangs) {
+TEST_P(ThreadPoolExitTest, NeitherCrashesNorHangs) {
   for (int i = 0; i < kRepetitions; ++i) {
     ASSERT_EQ(RunProbe(GetParam()), 0) << "run " << i;
   }
@@ -61,14 +60,14 @@ std::string NameOf(const testing::TestParamInfo<const char*>& info) {
   return name;
 }
 
-INSTANTIATE_TEST_SUITE_P(Scenario, ThreadPoolExit,
+INSTANTIATE_TEST_SUITE_P(Scenarios, ThreadPoolExitTest,
                          testing::Values("busy", "blocked", "openssl", "timers", "completions",
                                          "connects", "exit-from-worker", "exit-from-io", "unused"),
                          NameOf);
 
-TEST(ThreadPoolExitProbe, ReportsAnUnknownScenario) {
+TEST(ThreadPoolExitProbeTest, ReportsAnUnknownScenario) {
   EXPECT_EQ(RunProbe("no such scenario"), 2);
 }
 
 }  // namespace
-}  // namespace Tarnik::System
+}  // namespace Tarnik::Testing

@@ -1,0 +1,22 @@
+#ifndef TARNIK_TESTS_HTTP_RESPONSE_BODY_H
+#define TARNIK_TESTS_HTTP_RESPONSE_BODY_H
+
+#include <tarnik/http/http_response.h>
+
+#include <cstddef>
+#include <string>
+
+namespace Tarnik::Testing {
+
+inline std::string BodyOf(const Http::ClientResponse& response) {
+  std::string body;
+  char buffer[1000];
+  while (const std::size_t count = response.Body()->Read(buffer, sizeof(buffer))) {
+    body.append(buffer, count);
+  }
+  return body;
+}
+
+}  // namespace Tarnik::Testing
+
+#endif
