@@ -122,7 +122,7 @@ TEST(TransformListTest, RefusesCorrectSignaturesOverXPath) {
             "not supported.");
 }
 
-TEST(AlgorithmListTest, RefusesCorrectSignaturesWithSha1) {
+TEST(AlgorithmsTest, RefusesCorrectSignaturesWithSha1) {
   DevSts::SignOptions options;
   options.digest = DevSts::DigestAlgorithm::Sha1;
   EXPECT_EQ(Verdict(Signed(options)),
@@ -137,7 +137,7 @@ TEST(AlgorithmListTest, RefusesCorrectSignaturesWithSha1) {
 }
 
 // The URI with a trailing number sign means the same method; the oracle knows only the one without.
-TEST(AlgorithmListTest, AcceptsTheInclusiveMethodWithANumberSign) {
+TEST(AlgorithmsTest, AcceptsTheInclusiveMethodWithANumberSign) {
   SignatureTemplate signature;
   signature.canonicalization = kInclusive;
   signature.transforms = Transforms({kEnveloped, kInclusive});
@@ -153,7 +153,7 @@ TEST(AlgorithmListTest, AcceptsTheInclusiveMethodWithANumberSign) {
       "valid");
 }
 
-TEST(AlgorithmListTest, ChecksEveryListBeforeAnyKeyIsRequested) {
+TEST(AlgorithmsTest, ChecksEveryListBeforeAnyKeyIsRequested) {
   SignatureTemplate signature;
   signature.moreReferences =
       "<ds:Reference URI=\"#_a1\">" + Transforms({"urn:unknown"}) +
@@ -212,7 +212,7 @@ TEST(AlgorithmParametersTest, PrefixListsAreSplitAtWhiteSpace) {
   EXPECT_THAT(options.inclusivePrefixes, testing::ElementsAre("a", "b", "#default", "c"));
 }
 
-TEST(AlgorithmListTest, BoundsAndSanitisesWhatItQuotes) {
+TEST(AlgorithmsTest, BoundsAndSanitisesWhatItQuotes) {
   SignatureTemplate signature;
   signature.signatureMethod = "\xC3\xA4&#9;" + std::string(100'000, 'x');
   const std::string verdict = Verdict(AssertionWithValues(signature));
