@@ -7,7 +7,7 @@
 namespace SsoClient {
 namespace {
 
-using TestSupport::ThrownMessage;
+using Testing::ThrownMessage;
 
 constexpr char kService[] = "HTTP@sts.example";
 const std::string kWithNul("a\0b", 3);

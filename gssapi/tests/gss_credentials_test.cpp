@@ -13,7 +13,7 @@
 namespace SsoClient {
 namespace {
 
-using TestSupport::ThrownMessage;
+using Testing::ThrownMessage;
 using namespace std::chrono_literals;
 
 // Credentials are judged by whom a service sees log in with them.

@@ -9,7 +9,7 @@
 namespace SsoClient {
 namespace {
 
-using TestSupport::ThrownMessage;
+using Testing::ThrownMessage;
 
 std::string MessageOf(const GssStatus& status) {
   return ThrownMessage<SsoException>([&] { CheckGssStatus("The attempt failed", status); });

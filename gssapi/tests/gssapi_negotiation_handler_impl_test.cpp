@@ -23,7 +23,7 @@ using Testing::GssAcceptor;
 using testing::HasSubstr;
 using Testing::InitResult;
 using Testing::InitSecContextScript;
-using TestSupport::ThrownMessage;
+using Testing::ThrownMessage;
 using namespace std::chrono_literals;
 
 using Leg = std::vector<unsigned char>;

@@ -8,7 +8,7 @@
 namespace SsoClient {
 namespace {
 
-using TestSupport::ThrownMessage;
+using Testing::ThrownMessage;
 
 class KeytabCheckTest : public Testing::RealmFixture {
  protected:

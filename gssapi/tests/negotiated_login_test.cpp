@@ -23,7 +23,7 @@ namespace SsoClient {
 namespace {
 
 using Testing::GssAcceptor;
-using TestSupport::ThrownMessage;
+using Testing::ThrownMessage;
 
 using Leg = std::vector<unsigned char>;
 
@@ -55,7 +55,7 @@ std::string LegAnswer(const Leg& leg) {
 std::string TokenAnswer(const Leg& leg) {
   return Testing::Envelope(Testing::Collection(Testing::Rstr(
       Exchange(leg) + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
-          Testing::Requested(TestSupport::AssertionText().ToXml()),
+          Testing::Requested(Testing::AssertionText().ToXml()),
       " Context=\"c\"")));
 }
 

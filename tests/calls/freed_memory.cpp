@@ -2,9 +2,12 @@
 
 #include <malloc.h>
 
+#include <atomic>
+#include <cstddef>
 #include <cstdlib>
 #include <cstring>
 #include <new>
+#include <string>
 #include <utility>
 
 namespace SsoClient::Testing {

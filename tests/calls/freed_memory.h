@@ -2,7 +2,6 @@
 #define SSOCLIENT_TESTS_CALLS_FREED_MEMORY_H
 
 #include <atomic>
-#include <cstddef>
 #include <string>
 
 namespace SsoClient::Testing {

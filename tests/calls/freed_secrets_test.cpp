@@ -1,8 +1,13 @@
 // What logs somebody in is not left behind in memory.
-#include <gmock/gmock.h>
-#include <tarnik/text/string_util.h>
-
+#include <memory>
 #include <numeric>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/negotiation_handler.h>
+#include <tarnik/text/string_util.h>
 
 #include "calls/freed_memory.h"
 #include "sts/answers.h"
@@ -14,14 +19,8 @@
 #include "sts/token_specs.h"
 #include "support/assertion_text.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
-
-using Testing::FakeTransport;
-using Testing::FreedMemory;
-using Testing::LastLegAnswer;
-using Testing::LegAnswer;
-using Testing::OneHour;
 
 using Leg = std::vector<unsigned char>;
 
@@ -82,8 +81,8 @@ INSTANTIATE_TEST_SUITE_P(Forms, FreedLegTest, testing::Bool(),
 constexpr char kTokenMarkup[] = "</saml2:Issuer><";
 
 TEST(FreedTokenTest, IsNotLeftOfANegotiationByLegs) {
-  const auto transport = std::make_shared<FakeTransport>(
-      LastLegAnswer(TestSupport::AssertionText().ToXml(), Testing::kLeg));
+  const auto transport =
+      std::make_shared<FakeTransport>(LastLegAnswer(AssertionText().ToXml(), kLeg));
   InternalApi::GssNegotiationContextImpl context(
       OneHour(), std::make_shared<RequestBuilderImpl>(boost::none), transport->CreateSession(),
       std::make_shared<ResponseHandlerImpl>(), nullptr);
@@ -105,10 +104,10 @@ class QuietHandler final : public NegotiationHandler {
 
 TEST(FreedTokenTest, IsNotLeftOfAnAnswerWithoutAContext) {
   const auto transport =
-      std::make_shared<FakeTransport>(LastLegAnswer(TestSupport::AssertionText().ToXml(), {}, ""));
+      std::make_shared<FakeTransport>(LastLegAnswer(AssertionText().ToXml(), {}, ""));
   const SecurityTokenServiceImpl service(std::make_shared<RequestBuilderImpl>(boost::none),
                                          transport, std::make_shared<ResponseHandlerImpl>(),
-                                         std::make_shared<Testing::FakeTokenFactory>());
+                                         std::make_shared<FakeTokenFactory>());
   QuietHandler handler;
   const FreedMemory memory(kTokenMarkup);
   EXPECT_THROW(service.AcquireTokenByGSS(OneHour(), handler), CommunicationException);
@@ -116,4 +115,4 @@ TEST(FreedTokenTest, IsNotLeftOfAnAnswerWithoutAContext) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

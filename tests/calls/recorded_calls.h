@@ -1,6 +1,7 @@
 #ifndef SSOCLIENT_TESTS_CALLS_RECORDED_CALLS_H
 #define SSOCLIENT_TESTS_CALLS_RECORDED_CALLS_H
 
+#include <cstddef>
 #include <string>
 #include <vector>
 

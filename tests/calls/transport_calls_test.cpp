@@ -1,20 +1,33 @@
 // How the transport uses the platform, and who makes one with which limits.
 #include "transport/https_client.h"
 
+#include <memory>
+#include <string>
+
 #include <gmock/gmock.h>
 #include <ssoclient/gss_negotiation_context.h>
+#include <ssoclient/saml_token.h>
+#include <ssoclient/saml_token_factory.h>
 #include <ssoclient/security_token_service.h>
+#include <ssoclient/security_token_service_config.h>
+#include <ssoclient/token_spec.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/http_user_agent.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/xml/element_node.h>
 
 #include "calls/recorded_calls.h"
 #include "transport/fake_ssl.h"
 #include "transport/read_all.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using testing::ElementsAre;
 using testing::IsEmpty;
-using Testing::Recorded;
 using testing::SizeIs;
 
 constexpr unsigned long kTimeout = 5'000'000;
@@ -23,15 +36,15 @@ constexpr char kOwnAgent[] = "user agent: the spec, the cookie store, no pool";
 
 class TransportCallsTest : public testing::Test {
  protected:
-  TransportCallsTest() { Testing::ForgetCalls(); }
-  ~TransportCallsTest() override { Testing::ForgetCalls(); }
+  TransportCallsTest() { ForgetCalls(); }
+  ~TransportCallsTest() override { ForgetCalls(); }
 
-  Tarnik::Ref<Testing::FakeSslContext> sslContext_ = Tarnik::MakeRef<Testing::FakeSslContext>();
+  Tarnik::Ref<FakeSslContext> sslContext_ = Tarnik::MakeRef<FakeSslContext>();
 };
 
 TEST_F(TransportCallsTest, APlainUrlMakesAPlainSpec) {
   for (const bool flag : {false, true}) {
-    Testing::ForgetCalls();
+    ForgetCalls();
     const HttpsClient client("http://sts.example/", sslContext_.get(), "peer", kTimeout, flag);
     EXPECT_THAT(Recorded().log, ElementsAre(std::string("plain spec: sts.example:80, flag ") +
                                             (flag ? "set" : "not set")));
@@ -40,7 +53,7 @@ TEST_F(TransportCallsTest, APlainUrlMakesAPlainSpec) {
 
 TEST_F(TransportCallsTest, AnHttpsUrlMakesATlsSpec) {
   for (const bool flag : {false, true}) {
-    Testing::ForgetCalls();
+    ForgetCalls();
     const HttpsClient client(kHttps, sslContext_.get(), "peer", kTimeout, flag);
     EXPECT_THAT(Recorded().log, ElementsAre(std::string("TLS spec: sts.example:8443, flag ") +
                                             (flag ? "set" : "not set") + ", peer 'peer'"));
@@ -68,7 +81,7 @@ TEST_F(TransportCallsTest, EachSessionHasAnAgentAndCookiesOfItsOwn) {
 }
 
 TEST_F(TransportCallsTest, SessionsOfASharedAgentMakeNothing) {
-  const auto agent = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  const auto agent = Tarnik::MakeRef<FakeUserAgent>();
   const HttpsClient client(agent.get(), kHttps, kTimeout);
   client.CreateSession();
   EXPECT_THAT(Recorded().log, IsEmpty());
@@ -89,7 +102,7 @@ TEST_F(TransportCallsTest, ARequestGetsItsHeadersAndThenItsBodyInOneWrite) {
   Tarnik::Ref<Tarnik::Reader> reader;
   session->SendRequest(request, reader);
   EXPECT_THAT(Recorded().log, posted);
-  EXPECT_EQ(Testing::ReadAll(*reader), "answer");
+  EXPECT_EQ(ReadAll(*reader), "answer");
   EXPECT_THAT(agent->waitTimeouts, ElementsAre(kTimeout));
 
   Recorded().log.clear();
@@ -136,7 +149,7 @@ SecurityTokenServiceConfig ConfigWith(Tarnik::Ssl::SSLContext* sslContext, bool 
 
 TEST_F(TransportCallsTest, AServiceGivesEachExchange240SecondsAndHandsItsFlagOn) {
   for (const bool flag : {false, true}) {
-    Testing::ForgetCalls();
+    ForgetCalls();
     const auto service = CreateSecurityTokenService(ConfigWith(sslContext_.get(), flag));
     EXPECT_THAT(Recorded().log, ElementsAre(std::string("TLS spec: sts.example:8443, flag ") +
                                             (flag ? "set" : "not set") + ", peer 'peer'"));
@@ -161,4 +174,4 @@ TEST_F(TransportCallsTest, ANegotiationGivesEachLeg40SecondsOnOneSessionAndSetsN
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,14 +1,20 @@
 // Tokens on the strength of another one: plain, handed on, and on behalf of somebody.
+#include <memory>
+#include <set>
+#include <string>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
 
 class AcquireByTokenTest : public HolderOfKeyTest {
  protected:
@@ -131,4 +137,4 @@ TEST_F(AcquireByTokenTest, RenewalKeepsTheChain) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

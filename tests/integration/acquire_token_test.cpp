@@ -1,12 +1,17 @@
+#include <cstddef>
+#include <set>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::HasSubstr;
+using testing::ElementsAre;
+using testing::HasSubstr;
 
 class AcquireTokenTest : public StsTest {};
 
@@ -156,7 +161,7 @@ struct SigningCase {
   DevSts::KeyType key;
 };
 
-class SigningAlgorithmTest : public ::testing::TestWithParam<SigningCase> {};
+class SigningAlgorithmTest : public testing::TestWithParam<SigningCase> {};
 
 TEST_P(SigningAlgorithmTest, TokenIsAccepted) {
   DevSts::ServerOptions options;
@@ -174,18 +179,18 @@ using DevSts::KeyType;
 using DevSts::SignatureAlgorithm;
 
 INSTANTIATE_TEST_SUITE_P(Algorithms, SigningAlgorithmTest,
-                         ::testing::Values(SigningCase{"Rsa256", SignatureAlgorithm::RsaSha256,
-                                                       DigestAlgorithm::Sha256, KeyType::Rsa2048},
-                                           SigningCase{"Rsa384", SignatureAlgorithm::RsaSha384,
-                                                       DigestAlgorithm::Sha384, KeyType::Rsa2048},
-                                           SigningCase{"Rsa512", SignatureAlgorithm::RsaSha512,
-                                                       DigestAlgorithm::Sha512, KeyType::Rsa3072},
-                                           SigningCase{"Pss256", SignatureAlgorithm::RsaPssSha256,
-                                                       DigestAlgorithm::Sha256, KeyType::Rsa2048},
-                                           SigningCase{"Ecdsa256", SignatureAlgorithm::EcdsaSha256,
-                                                       DigestAlgorithm::Sha256, KeyType::EcP256},
-                                           SigningCase{"Ecdsa384", SignatureAlgorithm::EcdsaSha384,
-                                                       DigestAlgorithm::Sha384, KeyType::EcP384}),
+                         testing::Values(SigningCase{"Rsa256", SignatureAlgorithm::RsaSha256,
+                                                     DigestAlgorithm::Sha256, KeyType::Rsa2048},
+                                         SigningCase{"Rsa384", SignatureAlgorithm::RsaSha384,
+                                                     DigestAlgorithm::Sha384, KeyType::Rsa2048},
+                                         SigningCase{"Rsa512", SignatureAlgorithm::RsaSha512,
+                                                     DigestAlgorithm::Sha512, KeyType::Rsa3072},
+                                         SigningCase{"Pss256", SignatureAlgorithm::RsaPssSha256,
+                                                     DigestAlgorithm::Sha256, KeyType::Rsa2048},
+                                         SigningCase{"Ecdsa256", SignatureAlgorithm::EcdsaSha256,
+                                                     DigestAlgorithm::Sha256, KeyType::EcP256},
+                                         SigningCase{"Ecdsa384", SignatureAlgorithm::EcdsaSha384,
+                                                     DigestAlgorithm::Sha384, KeyType::EcP384}),
                          [](const auto& tested) { return tested.param.name; });
 
 class AnswerShapeTest : public StsTest {};
@@ -229,4 +234,4 @@ TEST_F(AnswerShapeTest, ChunkedAnswersOfAnyChunkSizeAreAccepted) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,14 +1,21 @@
 // Answers that belong to another operation, and answers that were changed on their way.
-#include <gmock/gmock.h>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <tuple>
+#include <typeinfo>
+
+#include <gtest/gtest.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 class AnswerConfusionTest : public HolderOfKeyTest,
-                            public ::testing::WithParamInterface<std::tuple<Operation, Operation>> {
+                            public testing::WithParamInterface<std::tuple<Operation, Operation>> {
  protected:
   /// The service's genuine answer.
   static std::string AnswerTo(Operation operation, const Arguments& arguments) {
@@ -48,8 +55,8 @@ TEST_P(AnswerConfusionTest, OnlyAnAnswerOfItsKindIsTaken) {
 }
 
 INSTANTIATE_TEST_SUITE_P(EveryPair, AnswerConfusionTest,
-                         ::testing::Combine(::testing::ValuesIn(kOperations),
-                                            ::testing::ValuesIn(kOperations)),
+                         testing::Combine(testing::ValuesIn(kOperations),
+                                          testing::ValuesIn(kOperations)),
                          [](const auto& tested) {
                            return std::string(NameOf(std::get<0>(tested.param))) + "AnsweredAs" +
                                   NameOf(std::get<1>(tested.param));
@@ -60,8 +67,7 @@ struct VerdictCase {
   const char* code;
 };
 
-class VerdictTextTest : public HolderOfKeyTest,
-                        public ::testing::WithParamInterface<VerdictCase> {};
+class VerdictTextTest : public HolderOfKeyTest, public testing::WithParamInterface<VerdictCase> {};
 
 // A verdict is one of two URIs as they stand; whatever resembles one is none.
 TEST_P(VerdictTextTest, IsNoVerdict) {
@@ -82,7 +88,7 @@ TEST_P(VerdictTextTest, IsNoVerdict) {
 
 INSTANTIATE_TEST_SUITE_P(
     Codes, VerdictTextTest,
-    ::testing::Values(
+    testing::Values(
         VerdictCase{"Empty", ""}, VerdictCase{"Bare", "valid"},
         VerdictCase{"OtherCase", "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/Valid"},
         VerdictCase{"Blank", " http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid"},
@@ -93,4 +99,4 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,12 +1,18 @@
-#include <gmock/gmock.h>
-
 #include <atomic>
+#include <chrono>
+#include <functional>
 #include <future>
+#include <memory>
+#include <string>
 #include <thread>
+#include <typeinfo>
+#include <vector>
+
+#include <gtest/gtest.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 class AsyncTest : public StsTest {};
@@ -147,4 +153,4 @@ TEST_F(AsyncTest, ConcurrentSynchronousCallsAllComplete) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,8 +1,11 @@
-#include <gmock/gmock.h>
+#include <cstddef>
+#include <memory>
+
+#include <gtest/gtest.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 class CutOffTest : public StsTest {
@@ -68,4 +71,4 @@ TEST_F(CutOffTest, ServiceGoesOnAfterwards) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

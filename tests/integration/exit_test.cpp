@@ -4,11 +4,16 @@
 
 #include <chrono>
 #include <cstdio>
+#include <cstdlib>
 #include <fstream>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 class TemporaryFile {
@@ -73,4 +78,4 @@ TEST_F(ExitTest, ProcessMayExitWhileTheServiceIsSilent) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,17 +1,31 @@
 // The asynchronous twins of all operations.
+#include <atomic>
+#include <chrono>
+#include <functional>
+#include <future>
+#include <iterator>
+#include <map>
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <thread>
+#include <tuple>
+#include <typeindex>
+#include <typeinfo>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <tarnik/crypto/crypto_exception.h>
-
-#include <map>
-#include <thread>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::StartsWith;
+using testing::StartsWith;
 
 constexpr std::chrono::seconds kPatience{120};
 
@@ -30,7 +44,7 @@ Outcome AwaitCall(Operation operation, const SecurityTokenService& service,
 }
 
 class EveryOperationAsyncTest : public HolderOfKeyTest,
-                                public ::testing::WithParamInterface<Operation> {
+                                public testing::WithParamInterface<Operation> {
  protected:
   static Arguments WithToken() {
     Arguments arguments;
@@ -102,7 +116,7 @@ TEST_P(EveryOperationAsyncTest, EmptyCallbackIsRefusedAtTheCall) {
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
-INSTANTIATE_TEST_SUITE_P(Operations, EveryOperationAsyncTest, ::testing::ValuesIn(kOperations),
+INSTANTIATE_TEST_SUITE_P(Operations, EveryOperationAsyncTest, testing::ValuesIn(kOperations),
                          [](const auto& tested) { return NameOf(tested.param); });
 
 /// Something that goes wrong.
@@ -148,7 +162,7 @@ void EditHolderCertificate(DevSts::Server& server, const std::string& text) {
 }
 
 class TroubleAsyncTest : public HolderOfKeyTest,
-                         public ::testing::WithParamInterface<std::tuple<Operation, Trouble>> {};
+                         public testing::WithParamInterface<std::tuple<Operation, Trouble>> {};
 
 TEST_P(TroubleAsyncTest, ArrivesAsTheSynchronousOperationThrowsIt) {
   const auto& [operation, trouble] = GetParam();
@@ -231,8 +245,8 @@ std::vector<Trouble> Troubles() {
 }
 
 INSTANTIATE_TEST_SUITE_P(EveryOperation, TroubleAsyncTest,
-                         ::testing::Combine(::testing::ValuesIn(kOperations),
-                                            ::testing::ValuesIn(Troubles())),
+                         testing::Combine(testing::ValuesIn(kOperations),
+                                          testing::ValuesIn(Troubles())),
                          [](const auto& tested) {
                            return std::string(NameOf(std::get<0>(tested.param))) +
                                   std::get<1>(tested.param).name;
@@ -333,4 +347,4 @@ TEST_F(HolderOfKeyAsyncTest, ThreadsShareOneServiceAndOneToken) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

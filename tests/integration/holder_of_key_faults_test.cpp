@@ -1,15 +1,24 @@
 // What the service refuses of a holder-of-key operation, as the caller sees it.
+#include <chrono>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <typeindex>
+#include <typeinfo>
+#include <utility>
+
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 using std::chrono::seconds;
-using ::testing::StartsWith;
+using testing::StartsWith;
 
 class HolderOfKeyFaultTest : public HolderOfKeyTest {
  protected:
@@ -68,7 +77,7 @@ struct PresentedCase {
 };
 
 class PresentedTokenFaultTest : public HolderOfKeyFaultTest,
-                                public ::testing::WithParamInterface<PresentedCase> {
+                                public testing::WithParamInterface<PresentedCase> {
  protected:
   static Operation Presenting() { return GetParam().operation; }
   static std::string Place() { return GetParam().place; }
@@ -113,8 +122,8 @@ TEST_P(PresentedTokenFaultTest, TokenThatAStrangerSignedIsRefused) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Operations, PresentedTokenFaultTest,
-                         ::testing::Values(PresentedCase{Operation::Token, "The presented token"},
-                                           PresentedCase{Operation::Renew, "The RenewTarget"}),
+                         testing::Values(PresentedCase{Operation::Token, "The presented token"},
+                                         PresentedCase{Operation::Renew, "The RenewTarget"}),
                          [](const auto& tested) { return NameOf(tested.param.operation); });
 
 TEST_F(HolderOfKeyFaultTest, ExpiredTokenIsRefused) {
@@ -212,8 +221,7 @@ constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
 constexpr char kSecext[] =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
 
-class AnyFaultTest : public HolderOfKeyFaultTest,
-                     public ::testing::WithParamInterface<FaultCase> {};
+class AnyFaultTest : public HolderOfKeyFaultTest, public testing::WithParamInterface<FaultCase> {};
 
 TEST_P(AnyFaultTest, IsTheSameExceptionFromEveryOperation) {
   Arguments arguments;
@@ -232,7 +240,7 @@ TEST_P(AnyFaultTest, IsTheSameExceptionFromEveryOperation) {
 
 INSTANTIATE_TEST_SUITE_P(
     Faults, AnyFaultTest,
-    ::testing::Values(
+    testing::Values(
         FaultCase{"FailedAuthentication", kTrust, "FailedAuthentication", "no",
                   typeid(InvalidCredentialsException), "Authentication failed: no"},
         FaultCase{"ExpiredPassword", kTrust, "FailedAuthentication",
@@ -250,4 +258,4 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,8 +1,15 @@
 #include "integration/holder_of_key_fixture.h"
 
+#include <chrono>
 #include <cstring>
+#include <ctime>
+#include <memory>
+#include <string>
+#include <vector>
 
-namespace SsoClient::Tests {
+#include "support/holder_of_key.h"
+
+namespace SsoClient::Testing {
 
 namespace {
 
@@ -42,11 +49,6 @@ DevSts::Credential HolderValidBetween(std::chrono::seconds notBefore,
   spec.notBefore = notBefore;
   spec.notAfter = notAfter;
   return DevSts::MakeCertificate(spec);
-}
-
-HolderOfKeyConfig ConfigOf(const DevSts::Credential& credential) {
-  return {Tarnik::Crypto::CreateCertificatesFromPem(credential.certificatePem).front(),
-          Tarnik::Crypto::CreatePrivateKeyFromPem(credential.privateKeyPem)};
 }
 
 std::shared_ptr<SecurityTokenService> MakeHolderService(const DevSts::Server& server,
@@ -104,4 +106,4 @@ DevSts::AssertionOptions ValidBetween(std::chrono::seconds start, std::chrono::s
   return options;
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

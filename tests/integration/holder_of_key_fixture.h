@@ -1,15 +1,16 @@
-#ifndef TESTS_INTEGRATION_HOLDER_OF_KEY_FIXTURE_H
-#define TESTS_INTEGRATION_HOLDER_OF_KEY_FIXTURE_H
+#ifndef SSOCLIENT_TESTS_INTEGRATION_HOLDER_OF_KEY_FIXTURE_H
+#define SSOCLIENT_TESTS_INTEGRATION_HOLDER_OF_KEY_FIXTURE_H
 
-#include <devsts/certificates.h>
-
+#include <chrono>
 #include <memory>
 #include <string>
 #include <vector>
 
+#include <devsts/certificates.h>
+
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 
 /// A solution user of the dev STS, known by the certificate of `Holder()` too.
 inline constexpr char kMachine[] = "machine@EXAMPLE.COM";
@@ -23,8 +24,6 @@ const DevSts::Credential& Stranger();
 /// A new RSA certificate of the key of `Holder()`, valid between these times from now.
 DevSts::Credential HolderValidBetween(std::chrono::seconds notBefore,
                                       std::chrono::seconds notAfter);
-
-HolderOfKeyConfig ConfigOf(const DevSts::Credential& credential);
 
 /// As `MakeService`, with the credential's holder-of-key configuration.
 std::shared_ptr<SecurityTokenService> MakeHolderService(const DevSts::Server& server,
@@ -61,6 +60,6 @@ class HolderOfKeyTest : public StsTest {
   }
 };
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing
 
 #endif

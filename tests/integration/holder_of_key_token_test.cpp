@@ -1,13 +1,17 @@
 // Tokens bound to the client's key: by password and by certificate.
+#include <set>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using testing::ElementsAre;
+using testing::IsEmpty;
 
 class HolderOfKeyTokenTest : public HolderOfKeyTest {};
 
@@ -104,4 +108,4 @@ TEST_F(HolderOfKeyTokenTest, RequestsOfOneServiceAreSignedAnewEachTime) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

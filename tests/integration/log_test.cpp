@@ -1,16 +1,18 @@
+#include <mutex>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <tarnik/service/log.h>
 
-#include <mutex>
-
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::HasSubstr;
-using ::testing::Not;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::Not;
 
 struct Line {
   int level;
@@ -144,4 +146,4 @@ TEST_F(LogTest, NoTokenTextInTheFailureOrTheLinesOfARefusedAnswer) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

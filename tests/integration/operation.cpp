@@ -1,10 +1,17 @@
 #include "integration/operation.h"
 
+#include <future>
+#include <memory>
+#include <optional>
 #include <ostream>
+#include <stdexcept>
+#include <type_traits>
 #include <typeinfo>
 #include <utility>
 
-namespace SsoClient::Tests {
+#include <gtest/gtest.h>
+
+namespace SsoClient::Testing {
 
 namespace {
 
@@ -107,4 +114,4 @@ std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& 
   return outcome;
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,7 +1,5 @@
-#ifndef TESTS_INTEGRATION_OPERATION_H
-#define TESTS_INTEGRATION_OPERATION_H
-
-#include <ssoclient/ssoclient.h>
+#ifndef SSOCLIENT_TESTS_INTEGRATION_OPERATION_H
+#define SSOCLIENT_TESTS_INTEGRATION_OPERATION_H
 
 #include <future>
 #include <iosfwd>
@@ -9,10 +7,13 @@
 #include <optional>
 #include <string>
 #include <typeindex>
+#include <typeinfo>
+
+#include <ssoclient/ssoclient.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 
 /// The operations of a service, for tests that are about all of them.
 enum class Operation { Password, Certificate, Token, Renew, Validate };
@@ -51,6 +52,6 @@ Outcome CallNow(Operation operation, const SecurityTokenService& service,
 std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& service,
                                const Arguments& arguments);
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing
 
 #endif

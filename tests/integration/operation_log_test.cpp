@@ -1,21 +1,26 @@
 // What each operation writes into the log, and what never stands there.
-#include <gmock/gmock.h>
-
+#include <cstddef>
 #include <functional>
+#include <stdexcept>
+#include <string>
+#include <tuple>
+#include <utility>
+#include <vector>
+
+#include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
-#include "integration/wire_request.h"
 #include "sts/log_capture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::ElementsAreArray;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-using ::testing::Not;
+using testing::ElementsAre;
+using testing::ElementsAreArray;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
 
 constexpr char kSpecText[] =
     "TokenSpec [tokenLifetimeSec=600, delegable=false, delegateTo=<unset>, renewable=false, "
@@ -52,7 +57,7 @@ std::string RequestLine(Operation operation, const Arguments& arguments) {
   return {};
 }
 
-class OperationLogTest : public HolderOfKeyTest, public ::testing::WithParamInterface<Operation> {
+class OperationLogTest : public HolderOfKeyTest, public testing::WithParamInterface<Operation> {
  protected:
   OperationLogTest() { arguments_.token = AcquireBound(); }
 
@@ -62,7 +67,7 @@ class OperationLogTest : public HolderOfKeyTest, public ::testing::WithParamInte
 TEST_P(OperationLogTest, SuccessWritesItsLinesInOrder) {
   const auto service = HolderService();
   for (const int level : {7, 9}) {
-    const Testing::LogCapture log(level);
+    const LogCapture log(level);
     const Outcome outcome = CallNow(GetParam(), *service, arguments_);
     ASSERT_TRUE(outcome.IsSuccess()) << outcome.message;
     std::vector<std::string> expected = {Started(GetParam()), RequestLine(GetParam(), arguments_)};
@@ -79,7 +84,7 @@ TEST_P(OperationLogTest, SuccessWritesItsLinesInOrder) {
 TEST_P(OperationLogTest, LevelsFiveAndSixTellOnlyOfAnAcquiredToken) {
   const auto service = HolderService();
   for (const int level : {5, 6}) {
-    const Testing::LogCapture log(level);
+    const LogCapture log(level);
     const Outcome outcome = CallNow(GetParam(), *service, arguments_);
     if (GetParam() == Operation::Validate) {
       EXPECT_THAT(log.Lines(), IsEmpty());
@@ -95,7 +100,7 @@ TEST_P(OperationLogTest, FailureOfTheServiceStillWritesTheEndLine) {
                                           "RequestFailed", "no", false, 500};
   Sts().SetMisbehavior(misbehavior);
   const auto service = HolderService();
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   EXPECT_FALSE(CallNow(GetParam(), *service, arguments_).IsSuccess());
   std::vector<std::string> expected = {Started(GetParam()), RequestLine(GetParam(), arguments_)};
   if (GetParam() == Operation::Password) {
@@ -113,7 +118,7 @@ TEST_P(OperationLogTest, LocalFailureStillWritesTheEndLine) {
   }
   arguments_.spec.tokenLifetimeSec = -1;
   const auto service = HolderService();
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   EXPECT_FALSE(CallNow(GetParam(), *service, arguments_).IsSuccess());
   const auto lines = log.Lines();
   ASSERT_EQ(lines.size(), 3U);
@@ -125,7 +130,7 @@ TEST_P(OperationLogTest, LocalFailureStillWritesTheEndLine) {
 
 TEST_P(OperationLogTest, AsynchronousTwinWritesTheSameLines) {
   const auto service = HolderService();
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   ASSERT_TRUE(CallAsync(GetParam(), *service, arguments_).get().IsSuccess());
   const auto lines = log.Lines();
   EXPECT_EQ(lines.front(), Started(GetParam()));
@@ -135,7 +140,7 @@ TEST_P(OperationLogTest, AsynchronousTwinWritesTheSameLines) {
 
 TEST_P(OperationLogTest, ByDefaultSuccessAndFailureAreSilent) {
   const auto service = HolderService();
-  const Testing::LogCapture log(4);
+  const LogCapture log(4);
   EXPECT_TRUE(CallNow(GetParam(), *service, arguments_).IsSuccess());
   arguments_.token = Acquire();
   arguments_.password = "wrong-secret";
@@ -181,7 +186,7 @@ struct Mishap {
 };
 
 class SecretLogTest : public HolderOfKeyTest,
-                      public ::testing::WithParamInterface<std::tuple<Operation, Mishap>> {};
+                      public testing::WithParamInterface<std::tuple<Operation, Mishap>> {};
 
 TEST_P(SecretLogTest, NoSecretInAnyLineOrMessage) {
   const auto& [operation, mishap] = GetParam();
@@ -201,7 +206,7 @@ TEST_P(SecretLogTest, NoSecretInAnyLineOrMessage) {
   const auto service = HolderService();
   mishap.prepare(Sts());
 
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   const Outcome outcome = CallNow(operation, *service, arguments);
   if (mishap.end != End::Either) {
     EXPECT_EQ(outcome.IsSuccess(), mishap.end == End::Success) << outcome.message;
@@ -264,21 +269,21 @@ void ForgetUsers(DevSts::Server& server) {
   server.SetUsers({});
 }
 
-INSTANTIATE_TEST_SUITE_P(Operations, OperationLogTest, ::testing::ValuesIn(kOperations),
+INSTANTIATE_TEST_SUITE_P(Operations, OperationLogTest, testing::ValuesIn(kOperations),
                          [](const auto& tested) { return NameOf(tested.param); });
 
 INSTANTIATE_TEST_SUITE_P(
     Operations, SecretLogTest,
-    ::testing::Combine(::testing::ValuesIn(kOperations),
-                       ::testing::Values(Mishap{"Success", End::Success, [](DevSts::Server&) {}},
-                                         Mishap{"CutOff", End::Failure, CutOff},
-                                         Mishap{"Halved", End::Failure, Halve},
-                                         Mishap{"Malformed", End::Either, Rename},
-                                         Mishap{"Falsified", End::Either, Falsify},
-                                         Mishap{"Refused", End::Either, ForgetUsers})),
+    testing::Combine(testing::ValuesIn(kOperations),
+                     testing::Values(Mishap{"Success", End::Success, [](DevSts::Server&) {}},
+                                     Mishap{"CutOff", End::Failure, CutOff},
+                                     Mishap{"Halved", End::Failure, Halve},
+                                     Mishap{"Malformed", End::Either, Rename},
+                                     Mishap{"Falsified", End::Either, Falsify},
+                                     Mishap{"Refused", End::Either, ForgetUsers})),
     [](const auto& tested) {
       return std::string(NameOf(std::get<0>(tested.param))) + std::get<1>(tested.param).name;
     });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,16 +1,18 @@
-#include <gmock/gmock.h>
-
 #include <netinet/in.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <string>
+
+#include <gmock/gmock.h>
+
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::HasSubstr;
-using ::testing::StartsWith;
+using testing::HasSubstr;
+using testing::StartsWith;
 
 constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
 constexpr char kSecext[] =
@@ -81,7 +83,7 @@ struct StatusCase {
   const char* reason;
 };
 
-class StatusTest : public RefusalTest, public ::testing::WithParamInterface<StatusCase> {};
+class StatusTest : public RefusalTest, public testing::WithParamInterface<StatusCase> {};
 
 TEST_P(StatusTest, IsNamedInTheMessageAndNothingIsFollowed) {
   DevSts::Misbehavior misbehavior;
@@ -97,11 +99,11 @@ TEST_P(StatusTest, IsNamedInTheMessageAndNothingIsFollowed) {
 
 INSTANTIATE_TEST_SUITE_P(
     Statuses, StatusTest,
-    ::testing::Values(StatusCase{404, "Not Found"}, StatusCase{503, "Service Unavailable"},
-                      StatusCase{301, "Moved Permanently"}, StatusCase{302, "Found"},
-                      StatusCase{303, "See Other"}, StatusCase{307, "Temporary Redirect"},
-                      StatusCase{308, "Permanent Redirect"}, StatusCase{300, "Multiple Choices"},
-                      StatusCase{401, "Unauthorized"}, StatusCase{502, "Bad Gateway"}));
+    testing::Values(StatusCase{404, "Not Found"}, StatusCase{503, "Service Unavailable"},
+                    StatusCase{301, "Moved Permanently"}, StatusCase{302, "Found"},
+                    StatusCase{303, "See Other"}, StatusCase{307, "Temporary Redirect"},
+                    StatusCase{308, "Permanent Redirect"}, StatusCase{300, "Multiple Choices"},
+                    StatusCase{401, "Unauthorized"}, StatusCase{502, "Bad Gateway"}));
 
 TEST_F(RefusalTest, GarbageInsteadOfXmlIsToldApart) {
   DevSts::Misbehavior misbehavior;
@@ -191,7 +193,7 @@ struct UnsendableCase {
   std::string text;
 };
 
-class UnsendableTextTest : public StsTest, public ::testing::WithParamInterface<UnsendableCase> {};
+class UnsendableTextTest : public StsTest, public testing::WithParamInterface<UnsendableCase> {};
 
 TEST_P(UnsendableTextTest, IsRefusedBeforeAnythingIsSent) {
   const std::string& text = GetParam().text;
@@ -214,18 +216,18 @@ TEST_P(UnsendableTextTest, IsRefusedBeforeAnythingIsSent) {
   const std::string message = MessageOf<Tarnik::InvalidArgumentException>(
       [&] { service->AcquireToken(kUser, text, TenMinutes()); });
   EXPECT_THAT(message, HasSubstr("wsse:Password"));
-  EXPECT_THAT(message, ::testing::Not(HasSubstr("hush")));
+  EXPECT_THAT(message, testing::Not(HasSubstr("hush")));
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
 INSTANTIATE_TEST_SUITE_P(Texts, UnsendableTextTest,
-                         ::testing::Values(UnsendableCase{"Nul", std::string("hu\0sh", 5)},
-                                           UnsendableCase{"Control", "hush\x01"},
-                                           UnsendableCase{"BrokenUtf8", "hush\xC3"},
-                                           UnsendableCase{"OverlongUtf8", "hush\xC0\x80"},
-                                           UnsendableCase{"Surrogate", "hush\xED\xA0\x80"},
-                                           UnsendableCase{"Fffe", "hush\xEF\xBF\xBE"}),
+                         testing::Values(UnsendableCase{"Nul", std::string("hu\0sh", 5)},
+                                         UnsendableCase{"Control", "hush\x01"},
+                                         UnsendableCase{"BrokenUtf8", "hush\xC3"},
+                                         UnsendableCase{"OverlongUtf8", "hush\xC0\x80"},
+                                         UnsendableCase{"Surrogate", "hush\xED\xA0\x80"},
+                                         UnsendableCase{"Fffe", "hush\xEF\xBF\xBE"}),
                          [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,14 +1,20 @@
 // Renewal over real TLS.
+#include <chrono>
+#include <memory>
+#include <set>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 using std::chrono::seconds;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
+using testing::HasSubstr;
+using testing::IsEmpty;
 
 constexpr char kUnableToRenew[] = "Unexpected SOAP fault: wst:UnableToRenew; request failed.";
 
@@ -128,4 +134,4 @@ TEST_F(RenewTokenTest, NewCertificateOfTheSameKeyRenewsToo) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

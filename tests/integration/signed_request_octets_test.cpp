@@ -1,4 +1,11 @@
 // Signed requests as they arrive, judged by another implementation of XML signatures.
+#include <memory>
+#include <set>
+#include <stdexcept>
+#include <string>
+#include <tuple>
+#include <vector>
+
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 
@@ -6,11 +13,11 @@
 #include "integration/operation.h"
 #include "integration/wire_request.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::StartsWith;
+using testing::ElementsAre;
+using testing::StartsWith;
 
 /// Where a text travels in a signed request.
 enum class Place { UserName, Password, Audience, AdviceSource, AdviceName, AdviceValue, Delegate };
@@ -26,7 +33,7 @@ struct PlaceCase {
 };
 
 class SignedTextTest : public HolderOfKeyTest,
-                       public ::testing::WithParamInterface<std::tuple<PlaceCase, TextCase>> {};
+                       public testing::WithParamInterface<std::tuple<PlaceCase, TextCase>> {};
 
 Arguments ArgumentsWith(Place place, const std::string& text) {
   Arguments arguments;
@@ -135,20 +142,20 @@ std::vector<TextCase> Texts() {
 
 INSTANTIATE_TEST_SUITE_P(
     EveryPlace, SignedTextTest,
-    ::testing::Combine(::testing::Values(PlaceCase{"UserName", Place::UserName},
-                                         PlaceCase{"Password", Place::Password},
-                                         PlaceCase{"Audience", Place::Audience},
-                                         PlaceCase{"AdviceSource", Place::AdviceSource},
-                                         PlaceCase{"AdviceName", Place::AdviceName},
-                                         PlaceCase{"AdviceValue", Place::AdviceValue},
-                                         PlaceCase{"Delegate", Place::Delegate}),
-                       ::testing::ValuesIn(Texts())),
+    testing::Combine(testing::Values(PlaceCase{"UserName", Place::UserName},
+                                     PlaceCase{"Password", Place::Password},
+                                     PlaceCase{"Audience", Place::Audience},
+                                     PlaceCase{"AdviceSource", Place::AdviceSource},
+                                     PlaceCase{"AdviceName", Place::AdviceName},
+                                     PlaceCase{"AdviceValue", Place::AdviceValue},
+                                     PlaceCase{"Delegate", Place::Delegate}),
+                     testing::ValuesIn(Texts())),
     [](const auto& tested) {
       return std::string(std::get<0>(tested.param).name) + std::get<1>(tested.param).name;
     });
 
 /// Requests that an assertion travels in: as the act-as token, as the presented one, as the target.
-class TravellingTokenTest : public HolderOfKeyTest, public ::testing::WithParamInterface<TextCase> {
+class TravellingTokenTest : public HolderOfKeyTest, public testing::WithParamInterface<TextCase> {
  protected:
   /// The assertion in the last request still is what its issuer signed, on its own.
   static void ExpectIntact(const SamlToken& token) {
@@ -225,8 +232,8 @@ TEST_P(TravellingTokenTest, IsPresentedBesideAnActAsToken) {
             (*spec.actAsToken)->Id());
 }
 
-INSTANTIATE_TEST_SUITE_P(Texts, TravellingTokenTest, ::testing::ValuesIn(Texts()),
+INSTANTIATE_TEST_SUITE_P(Texts, TravellingTokenTest, testing::ValuesIn(Texts()),
                          [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,15 +1,21 @@
 // What each operation signs and asks for, judged from the octets that arrive.
+#include <string>
+#include <typeindex>
+#include <typeinfo>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
 #include "integration/wire_request.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAreArray;
-using ::testing::IsEmpty;
+using testing::ElementsAreArray;
+using testing::IsEmpty;
 
 using DevSts::RequestSignature;
 using Names = std::vector<std::string>;
@@ -51,7 +57,7 @@ struct Cell {
   Expected expected;
 };
 
-class SigningDecisionTest : public HolderOfKeyTest, public ::testing::WithParamInterface<Cell> {
+class SigningDecisionTest : public HolderOfKeyTest, public testing::WithParamInterface<Cell> {
  protected:
   static Arguments ArgumentsOf(const Cell& cell) {
     Arguments arguments;
@@ -146,27 +152,27 @@ const Expected kNotBound =
 
 INSTANTIATE_TEST_SUITE_P(
     WithoutConfig, SigningDecisionTest,
-    ::testing::Values(Cell{"Password", kPass, false, false, false, kBearerByPassword},
-                      Cell{"PasswordActAs", kPass, false, false, true, kBearerByPassword},
-                      Cell{"PasswordBearer", kPass, false, true, false, kBearerByPassword},
-                      Cell{"PasswordBearerActAs", kPass, false, true, true, kBearerByPassword},
-                      Cell{"Certificate", kCert, false, false, false, kNoCertificateKey},
-                      Cell{"CertificateActAs", kCert, false, false, true, kNoCertificateKey},
-                      Cell{"CertificateBearer", kCert, false, true, false, kNoCertificateKey},
-                      Cell{"CertificateBearerActAs", kCert, false, true, true, kNoCertificateKey},
-                      Cell{"Token", kTok, false, false, false, kNoTokenKey},
-                      Cell{"TokenActAs", kTok, false, false, true, kNoTokenKey},
-                      Cell{"TokenBearer", kTok, false, true, false, kNoTokenKey},
-                      Cell{"TokenBearerActAs", kTok, false, true, true, kNoTokenKey},
-                      Cell{"RenewBound", kRen, false, false, false, kNoRenewKey},
-                      Cell{"RenewBearer", kRen, false, true, false, kNoRenewKey},
-                      Cell{"ValidateBound", kVal, false, false, false, {kPlain, "", ""}},
-                      Cell{"ValidateBearer", kVal, false, true, false, {kPlain, "", ""}}),
+    testing::Values(Cell{"Password", kPass, false, false, false, kBearerByPassword},
+                    Cell{"PasswordActAs", kPass, false, false, true, kBearerByPassword},
+                    Cell{"PasswordBearer", kPass, false, true, false, kBearerByPassword},
+                    Cell{"PasswordBearerActAs", kPass, false, true, true, kBearerByPassword},
+                    Cell{"Certificate", kCert, false, false, false, kNoCertificateKey},
+                    Cell{"CertificateActAs", kCert, false, false, true, kNoCertificateKey},
+                    Cell{"CertificateBearer", kCert, false, true, false, kNoCertificateKey},
+                    Cell{"CertificateBearerActAs", kCert, false, true, true, kNoCertificateKey},
+                    Cell{"Token", kTok, false, false, false, kNoTokenKey},
+                    Cell{"TokenActAs", kTok, false, false, true, kNoTokenKey},
+                    Cell{"TokenBearer", kTok, false, true, false, kNoTokenKey},
+                    Cell{"TokenBearerActAs", kTok, false, true, true, kNoTokenKey},
+                    Cell{"RenewBound", kRen, false, false, false, kNoRenewKey},
+                    Cell{"RenewBearer", kRen, false, true, false, kNoRenewKey},
+                    Cell{"ValidateBound", kVal, false, false, false, {kPlain, "", ""}},
+                    Cell{"ValidateBearer", kVal, false, true, false, {kPlain, "", ""}}),
     [](const auto& tested) { return tested.param.name; });
 
 INSTANTIATE_TEST_SUITE_P(
     WithConfig, SigningDecisionTest,
-    ::testing::Values(
+    testing::Values(
         Cell{"Password", kPass, true, false, false, {kSignedPassword, "PublicKey", kProof}},
         Cell{"PasswordActAs", kPass, true, false, true, {kWithPassword, "PublicKey", kProof}},
         Cell{"PasswordBearer", kPass, true, true, false, kBearerByPassword},
@@ -230,4 +236,4 @@ TEST_F(LocalCheckTest, DelegateToLeavesUseKeyOutOfASignedRequest) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

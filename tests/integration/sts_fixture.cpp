@@ -1,6 +1,9 @@
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+#include <memory>
+#include <string>
+
+namespace SsoClient::Testing {
 
 Tarnik::Ref<Tarnik::Ssl::SSLContext> TrustCa(const DevSts::Server& server) {
   Tarnik::Ssl::SSLContextConfig config;
@@ -41,4 +44,4 @@ DevSts::Server& StsTest::Sts() {
   return server;
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,15 +1,16 @@
-#ifndef TESTS_INTEGRATION_STS_FIXTURE_H
-#define TESTS_INTEGRATION_STS_FIXTURE_H
+#ifndef SSOCLIENT_TESTS_INTEGRATION_STS_FIXTURE_H
+#define SSOCLIENT_TESTS_INTEGRATION_STS_FIXTURE_H
+
+#include <memory>
+#include <string>
+#include <typeinfo>
 
 #include <devsts/server.h>
 #include <gtest/gtest.h>
 #include <ssoclient/ssoclient.h>
 #include <tarnik/crypto/certificate.h>
 
-#include <memory>
-#include <string>
-
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 
 inline constexpr char kUser[] = "alice@EXAMPLE.COM";
 inline constexpr char kPassword[] = "secret";
@@ -42,7 +43,7 @@ std::string MessageOf(Action&& action) {
 }
 
 /// One dev STS for all tests of the process, well-behaved at the start of each test.
-class StsTest : public ::testing::Test {
+class StsTest : public testing::Test {
  protected:
   StsTest();
 
@@ -55,6 +56,6 @@ class StsTest : public ::testing::Test {
   }
 };
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,11 +1,16 @@
+#include <functional>
+#include <string>
+#include <string_view>
+#include <utility>
+
 #include <gmock/gmock.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::HasSubstr;
+using testing::HasSubstr;
 
 constexpr char kTampered[] = "Failed to verify signature: token might have been tampered with.";
 
@@ -119,4 +124,4 @@ TEST_F(TokenTrustTest, ExpiredAnswerIsRefusedWithItsTime) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

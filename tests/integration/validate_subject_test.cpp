@@ -1,15 +1,18 @@
 // Verdicts over real TLS.
+#include <chrono>
+#include <string>
+
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/wire_request.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 using std::chrono::seconds;
-using ::testing::HasSubstr;
+using testing::HasSubstr;
 
 class ValidateSubjectTest : public HolderOfKeyTest {
  protected:
@@ -74,4 +77,4 @@ TEST_F(ValidateSubjectTest, RequestIsTheStatedOne) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,13 +1,16 @@
 // A login that Kerberos refuses tells why in Kerberos' own words, and nothing is sent.
+#include <chrono>
+#include <string>
+
 #include <gmock/gmock.h>
 
 #include "negotiation/realm_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
+using testing::HasSubstr;
+using testing::IsEmpty;
 using namespace std::chrono_literals;
 
 class KerberosErrorsTest : public RealmTest {
@@ -61,4 +64,4 @@ TEST_F(BrokenRealmTest, RealmThatDoesNotAnswer) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

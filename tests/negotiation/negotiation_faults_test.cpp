@@ -1,15 +1,20 @@
 // What a caller sees when the service goes wrong in the middle of a negotiation.
+#include <cstddef>
+#include <memory>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "negotiation/realm_fixture.h"
 #include "sts/log_capture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::Contains;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
+using testing::Contains;
+using testing::HasSubstr;
+using testing::IsEmpty;
 
 DevSts::NegotiationScript TwoLegs() {
   DevSts::NegotiationScript script;
@@ -130,7 +135,7 @@ TEST_F(NegotiationFaultsTest, APrincipalWithoutAnAccountIsRefused) {
 }
 
 TEST_F(NegotiationFaultsTest, FailureStillEndsItsLog) {
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   auto script = TwoLegs();
   script.failAtLeg = 1;
   Sts().SetNegotiationScript(script);
@@ -199,4 +204,4 @@ TEST_F(NegotiationFaultsTest, AHandlerWithoutALegIsRefusedBeforeAnythingIsSent) 
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,13 +1,18 @@
 #include "negotiation/realm_fixture.h"
 
 #include <cstdlib>
+#include <memory>
+#include <string>
+#include <vector>
 
-namespace SsoClient::Tests {
+#include <gtest/gtest.h>
+
+namespace SsoClient::Testing {
 
 namespace {
 
 /// Makes the process a part of the realm before any thread reads the environment.
-class RealmEnvironment : public ::testing::Environment {
+class RealmEnvironment : public testing::Environment {
  public:
   struct Parts {
     Parts() {
@@ -35,7 +40,7 @@ class RealmEnvironment : public ::testing::Environment {
 };
 
 RealmEnvironment* const environment = new RealmEnvironment;
-const auto* const registered = ::testing::AddGlobalTestEnvironment(environment);
+const auto* const registered = testing::AddGlobalTestEnvironment(environment);
 
 }  // namespace
 
@@ -107,4 +112,4 @@ std::vector<DevSts::ReceivedLeg> RealmTest::Legs() {
   return legs;
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,23 +1,21 @@
 #include "sts/response_handler.h"
 
+#include <functional>
+#include <string>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/reader.h>
 
-#include <functional>
-
 #include "sts/answers.h"
 
 // Answers of one operation given to another.
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using Testing::Collection;
 using testing::ElementsAre;
-using Testing::Envelope;
-using Testing::kAssertionXml;
-using Testing::Requested;
-using Testing::Rstr;
 
 constexpr char kContext[] = " Context=\"urn:uuid:1\"";
 
@@ -96,4 +94,4 @@ TEST(AnswerConfusionTest, ARequestSentBackIsNoAnswer) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

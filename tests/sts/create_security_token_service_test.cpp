@@ -1,10 +1,18 @@
+#include <memory>
+#include <string>
+
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
+#include <ssoclient/saml_token.h>
+#include <ssoclient/saml_token_factory.h>
 #include <ssoclient/security_token_service.h>
+#include <ssoclient/security_token_service_config.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/connection_spec.h>
 #include <tarnik/http/http_user_agent.h>
-
-#include <functional>
-#include <string>
+#include <tarnik/xml/element_node.h>
 
 #include "sts/answers.h"
 #include "sts/token_specs.h"
@@ -17,12 +25,10 @@
 #include "transport/loopback_server.h"
 #include "transport/sso_connection_specs.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using testing::HasSubstr;
-using Testing::IssueAnswer;
-using Testing::OneHour;
 using testing::StartsWith;
 
 class AcceptingFactory final : public SamlTokenFactory {
@@ -31,7 +37,7 @@ class AcceptingFactory final : public SamlTokenFactory {
     return CreateToken(xml, 600);
   }
   std::shared_ptr<const SamlToken> CreateToken(const std::string& xml, long) const override {
-    return std::make_shared<Testing::FakeSamlToken>(xml);
+    return std::make_shared<FakeSamlToken>(xml);
   }
   std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
     return nullptr;
@@ -55,7 +61,7 @@ constexpr char kNoKey[] = "No HolderOfKeyConfig provided. Unable to acquire toke
 
 template <class Config>
 std::string ByCertificateWithoutAKey(const Config& config) {
-  return TestSupport::ThrownMessage<Tarnik::InvalidStateException>(
+  return ThrownMessage<Tarnik::InvalidStateException>(
       [&] { CreateSecurityTokenService(config)->AcquireTokenByCertificate(OneHour()); });
 }
 
@@ -66,15 +72,14 @@ class CreateSecurityTokenServiceTest : public testing::Test {
     config_.tokenFactory = std::make_shared<AcceptingFactory>();
   }
 
-  Testing::LoopbackServer server_{
-      [](const std::string&) { return Testing::OkAnswer(IssueAnswer()); }};
+  LoopbackServer server_{[](const std::string&) { return OkAnswer(IssueAnswer()); }};
   SecurityTokenServiceConfig config_;
 };
 
 TEST_F(CreateSecurityTokenServiceTest, AcquiresATokenOverHttp) {
   const auto token = CreateSecurityTokenService(config_)->AcquireToken("alice", "pw", OneHour());
   ASSERT_NE(token, nullptr);
-  EXPECT_EQ(token->Xml(), Testing::kCanonicalAssertion);
+  EXPECT_EQ(token->Xml(), kCanonicalAssertion);
   ASSERT_EQ(server_.Requests().size(), 1U);
   const auto request = server_.Requests()[0];
   EXPECT_THAT(request, StartsWith("POST /sts/STSService HTTP/1.1\r\n"));
@@ -96,17 +101,17 @@ TEST_F(CreateSecurityTokenServiceTest, ReadsTheConfigurationOnce) {
 }
 
 TEST_F(CreateSecurityTokenServiceTest, SignsWithTheConfiguredKeyOrNotAtAll) {
-  const auto credential = Testing::KeyCredential();
+  const auto credential = KeyCredential();
   EXPECT_EQ(ByCertificateWithoutAKey(config_), kNoKey);
-  config_.holderOfKeyConfig = Testing::ConfigOf(credential);
+  config_.holderOfKeyConfig = ConfigOf(credential);
   CreateSecurityTokenService(config_)->AcquireTokenByCertificate(OneHour());
-  const auto body = Testing::BodyOf(server_.Requests().at(0));
+  const auto body = BodyOf(server_.Requests().at(0));
   const auto verdict = DevSts::VerifyXml(body, credential.certificatePem);
   EXPECT_TRUE(verdict.valid) << verdict.reason;
 }
 
 TEST_F(CreateSecurityTokenServiceTest, TheKeyInfoResolverIsNotForTheService) {
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   config_.keyInfoResolver = resolver.get();
   const auto service = CreateSecurityTokenService(config_);
   EXPECT_EQ(resolver->RefCount(), 1);
@@ -120,7 +125,7 @@ TEST_F(CreateSecurityTokenServiceTest, HttpsNeedsAnSslContext) {
 }
 
 TEST_F(CreateSecurityTokenServiceTest, HandsTheTlsValuesOn) {
-  const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
+  const auto context = Tarnik::MakeRef<FakeSslContext>();
   config_.url = "https://127.0.0.1:" + std::to_string(server_.Port()) + "/";
   config_.sslContext = context.get();
   config_.sslPeerName = "sts.example";
@@ -142,15 +147,13 @@ TEST_F(CreateSecurityTokenServiceTest, ATokenFactoryIsNeeded) {
 class CreateSecurityTokenServiceExTest : public CreateSecurityTokenServiceTest {
  protected:
   CreateSecurityTokenServiceExTest() {
-    agent_->onWait = [] {
-      return Tarnik::MakeRef<Testing::FakeResponse>(200, "OK", IssueAnswer());
-    };
+    agent_->onWait = [] { return Tarnik::MakeRef<FakeResponse>(200, "OK", IssueAnswer()); };
     configEx_.url = "/used/as/it/stands";
     configEx_.userAgent = agent_;
     configEx_.tokenFactory = config_.tokenFactory;
   }
 
-  Tarnik::Ref<Testing::FakeUserAgent> agent_ = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  Tarnik::Ref<FakeUserAgent> agent_ = Tarnik::MakeRef<FakeUserAgent>();
   SecurityTokenServiceConfigEx configEx_;
 };
 
@@ -163,7 +166,7 @@ TEST_F(CreateSecurityTokenServiceExTest, SendsThroughTheCallersAgentFor240Second
 
 TEST_F(CreateSecurityTokenServiceExTest, SignsWithTheConfiguredKeyOrNotAtAll) {
   EXPECT_EQ(ByCertificateWithoutAKey(configEx_), kNoKey);
-  configEx_.holderOfKeyConfig = Testing::ConfigOf(Testing::KeyCredential());
+  configEx_.holderOfKeyConfig = ConfigOf(KeyCredential());
   EXPECT_NE(CreateSecurityTokenService(configEx_)->AcquireTokenByCertificate(OneHour()), nullptr);
 }
 
@@ -185,4 +188,4 @@ TEST_F(CreateSecurityTokenServiceExTest, AnAgentAndATokenFactoryAreNeeded) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

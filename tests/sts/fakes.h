@@ -10,9 +10,14 @@
 #include <utility>
 #include <vector>
 
-#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
+#include <ssoclient/saml_token.h>
 #include <ssoclient/saml_token_factory.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/http_user_agent.h>
+#include <tarnik/xml/element_node.h>
 
 #include "support/fake_saml_token.h"
 #include "transport/transport.h"

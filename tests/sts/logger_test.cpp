@@ -1,12 +1,12 @@
 #include "sts/logger.h"
 
-#include <gmock/gmock.h>
-
 #include <stdexcept>
+
+#include <gmock/gmock.h>
 
 #include "sts/log_capture.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using testing::ElementsAre;
@@ -17,7 +17,7 @@ TEST(LoggerTest, IsNamedAfterTheLibrary) {
 }
 
 TEST(OperationLogTest, TellsStartAndEndAtLevelSeven) {
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   {
     const OperationLog operation("AcquireToken");
     EXPECT_THAT(log.Lines(),
@@ -28,7 +28,7 @@ TEST(OperationLogTest, TellsStartAndEndAtLevelSeven) {
 }
 
 TEST(OperationLogTest, TellsTheEndOfAnOperationThatFails) {
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   try {
     const OperationLog operation("X");
     throw std::runtime_error("failed");
@@ -39,10 +39,10 @@ TEST(OperationLogTest, TellsTheEndOfAnOperationThatFails) {
 }
 
 TEST(OperationLogTest, IsSilentBelowLevelSeven) {
-  const Testing::LogCapture log(6);
+  const LogCapture log(6);
   { const OperationLog operation("X"); }
   EXPECT_THAT(log.Lines(), IsEmpty());
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,17 +1,16 @@
-#ifndef SSOCLIENT_TESTS_ASSERTION_TEXT_H
-#define SSOCLIENT_TESTS_ASSERTION_TEXT_H
-
-#include <devsts/certificates.h>
-#include <devsts/xml_security.h>
+#ifndef SSOCLIENT_TESTS_SUPPORT_ASSERTION_TEXT_H
+#define SSOCLIENT_TESTS_SUPPORT_ASSERTION_TEXT_H
 
 #include <string>
 #include <string_view>
 
+#include <devsts/certificates.h>
+#include <devsts/xml_security.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/system/date_time.h>
 #include <tarnik/xml/security/key_info_resolver.h>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
 /// Declarations of the prefixes saml2, ds, rsa, del, xs and xsi.
 std::string NamespaceDeclarations();
@@ -65,6 +64,6 @@ const DevSts::Credential& TrustedCredential();
 const DevSts::Credential& StrangerCredential();
 Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> TrustedResolver();
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

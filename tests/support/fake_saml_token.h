@@ -1,10 +1,17 @@
 #ifndef SSOCLIENT_TESTS_SUPPORT_FAKE_SAML_TOKEN_H
 #define SSOCLIENT_TESTS_SUPPORT_FAKE_SAML_TOKEN_H
 
+#include <set>
 #include <string>
 #include <utility>
+#include <vector>
 
+#include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/system/date_time.h>
+#include <tarnik/xml/security/signature.h>
 
 namespace SsoClient::Testing {
 

@@ -1,10 +1,13 @@
 #include "support/forgeries.h"
 
+#include <cstddef>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "support/assertion_text.h"
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 namespace {
 
 AssertionText ForgedText(ForgedId id) {
@@ -154,4 +157,4 @@ std::string Arranged(Place place, const std::string& forged, const std::string& 
   return "";
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing

@@ -1,10 +1,10 @@
-#ifndef SSOCLIENT_TESTS_FORGERIES_H
-#define SSOCLIENT_TESTS_FORGERIES_H
+#ifndef SSOCLIENT_TESTS_SUPPORT_FORGERIES_H
+#define SSOCLIENT_TESTS_SUPPORT_FORGERIES_H
 
 #include <string>
 #include <vector>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
 enum class ForgedId { kSame, kNew, kNone };
 enum class ForgedSignature { kOriginal, kStranger, kUnsigned, kMadeUp };
@@ -44,6 +44,6 @@ std::string ForgedAssertion(ForgedId id, ForgedSignature signature, const std::s
 /// hide the original in.
 std::string Arranged(Place place, const std::string& forged, const std::string& original);
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,12 +1,14 @@
 #include "support/second_opinion.h"
 
-#include <devsts/xml_security.h>
-
+#include <cstddef>
 #include <regex>
+#include <string>
+
+#include <devsts/xml_security.h>
 
 #include "support/assertion_text.h"
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 namespace {
 
 // The attribute that the parser complains of, "xmlns" or "xmlns:p"; "" for another complaint.
@@ -59,4 +61,4 @@ std::string SecondOpinionOf(std::string xml) {
   }
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing

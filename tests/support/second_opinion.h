@@ -1,9 +1,9 @@
-#ifndef SSOCLIENT_TESTS_SECOND_OPINION_H
-#define SSOCLIENT_TESTS_SECOND_OPINION_H
+#ifndef SSOCLIENT_TESTS_SUPPORT_SECOND_OPINION_H
+#define SSOCLIENT_TESTS_SUPPORT_SECOND_OPINION_H
 
 #include <string>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
 /// What an independent reader of XML signatures says against the text's first signature under the
 /// trusted credential's key; "" when it finds nothing wrong.
@@ -13,6 +13,6 @@ namespace TestSupport {
 /// where the signature or a name depends on the URI, the opinion is then bad as it should be.
 std::string SecondOpinionOf(std::string xml);
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

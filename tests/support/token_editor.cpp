@@ -1,12 +1,17 @@
 #include "support/token_editor.h"
 
 #include <array>
+#include <cstddef>
+#include <functional>
+#include <string>
 #include <utility>
+
+#include <devsts/xml_security.h>
 
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 namespace {
 
 // What a canonical form may or may not see.
@@ -160,4 +165,4 @@ void TokenEditor::MoveElement(std::string& xml) {
   xml.insert(tag == std::string::npos ? xml.size() : tag + 1, element);
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing

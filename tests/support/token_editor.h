@@ -1,11 +1,11 @@
-#ifndef SSOCLIENT_TESTS_TOKEN_EDITOR_H
-#define SSOCLIENT_TESTS_TOKEN_EDITOR_H
+#ifndef SSOCLIENT_TESTS_SUPPORT_TOKEN_EDITOR_H
+#define SSOCLIENT_TESTS_SUPPORT_TOKEN_EDITOR_H
 
 #include <cstddef>
 #include <functional>
 #include <string>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
 /// Makes signed assertions of every kind and edits them, as a source of numbers decides: by chance,
 /// or by a fuzzer's input.
@@ -28,6 +28,6 @@ class TokenEditor {
   std::function<std::size_t(std::size_t)> below_;
 };
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,19 +1,21 @@
-#include <ssoclient/saml_token.h>
-
 #include <algorithm>
+#include <cstddef>
 #include <ctime>
 #include <functional>
+#include <ostream>
+#include <string>
+
+#include <gtest/gtest.h>
+#include <ssoclient/saml_token.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/parse_xml.h"
 
 // The time that a token takes grows as its size does, whatever is in it.
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
-
-using TestSupport::AssertionText;
-using TestSupport::InsertedBehind;
-using TestSupport::Replaced;
 
 std::string Repeated(const std::string& text, std::size_t count) {
   std::string result;
@@ -85,10 +87,10 @@ void PrintTo(const Shape& shape, std::ostream* stream) {
   *stream << shape.name;
 }
 
-class TokenScaling : public testing::TestWithParam<Shape> {
+class TokenScalingTest : public testing::TestWithParam<Shape> {
  protected:
   static std::string SignedXml(std::size_t factor) {
-    return GetParam().make(GetParam().count * factor).ToSignedXml(TestSupport::TrustedCredential());
+    return GetParam().make(GetParam().count * factor).ToSignedXml(TrustedCredential());
   }
 
   // Each doubling may cost 2.5 times the time; a quadratic step costs four times.
@@ -100,22 +102,21 @@ class TokenScaling : public testing::TestWithParam<Shape> {
     EXPECT_LT(largeTime, 2.5 * 2.5 * std::max(smallTime, 1e-3));
   }
 
-  const Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> resolver_ =
-      TestSupport::TrustedResolver();
+  const Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> resolver_ = TrustedResolver();
 };
 
-TEST_P(TokenScaling, OfVerifyingAText) {
+TEST_P(TokenScalingTest, OfVerifyingAText) {
   ExpectLinear([&](const std::string& xml) { CreateSamlToken(xml, resolver_.get()); });
 }
 
-TEST_P(TokenScaling, OfVerifyingAnElementAndItsCanonicalText) {
+TEST_P(TokenScalingTest, OfVerifyingAnElementAndItsCanonicalText) {
   ExpectLinear([&](const std::string& xml) {
-    const auto document = TestSupport::ParseXml(xml);
+    const auto document = ParseXml(xml);
     CreateSamlTokenFromDom(document->RootElement(), resolver_.get());
   });
 }
 
-INSTANTIATE_TEST_SUITE_P(Shapes, TokenScaling,
+INSTANTIATE_TEST_SUITE_P(Shapes, TokenScalingTest,
                          testing::Values(Shape{"ManyAudiences", ManyAudiences, 2000},
                                          Shape{"ManyGroups", ManyGroups, 1500},
                                          Shape{"LongIssuer", LongIssuer, 5000},
@@ -124,4 +125,4 @@ INSTANTIATE_TEST_SUITE_P(Shapes, TokenScaling,
                          [](const auto& test) { return test.param.name; });
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -7,8 +7,10 @@
 #include <utility>
 #include <vector>
 
+#include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
 #include <tarnik/http/http_response.h>
 #include <tarnik/http/http_user_agent.h>
 

@@ -2,6 +2,7 @@
 #define SSOCLIENT_TESTS_TRANSPORT_FAKE_SSL_H
 
 #include <atomic>
+#include <cstddef>
 #include <optional>
 #include <string>
 #include <utility>

@@ -1,11 +1,5 @@
 #include "transport/https_client.h"
 
-#include <devsts/server.h>
-#include <gmock/gmock.h>
-#include <ssoclient/exceptions.h>
-#include <tarnik/crypto/certificate.h>
-#include <tarnik/ssl/ssl_context.h>
-
 #include <atomic>
 #include <chrono>
 #include <future>
@@ -14,10 +8,20 @@
 #include <tuple>
 #include <typeinfo>
 
+#include <devsts/server.h>
+#include <gmock/gmock.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/http/http_user_agent.h>
+#include <tarnik/ssl/ssl_context.h>
+
 #include "transport/loopback_server.h"
 #include "transport/read_all.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Clock = std::chrono::steady_clock;
@@ -56,7 +60,7 @@ Result SendAndWait(const TransportSession& session, const SoapRequest& request) 
     EXPECT_EQ(reader, nullptr);
     return {"", typeid(error).name(), error.Message()};
   }
-  return {Testing::ReadAll(*reader), "", ""};
+  return {ReadAll(*reader), "", ""};
 }
 
 class AsyncExchange {
@@ -71,7 +75,7 @@ class AsyncExchange {
           }
           state->result.set_value(error != nullptr
                                       ? Result{"", typeid(*error).name(), error->Message()}
-                                      : Result{Testing::ReadAll(*reader), "", ""});
+                                      : Result{ReadAll(*reader), "", ""});
         },
         handle_);
   }
@@ -238,7 +242,7 @@ INSTANTIATE_TEST_SUITE_P(Stalls, CancelledExchangeTest,
                          NameOf);
 
 TEST_F(HttpsExchangeTest, AConnectionThatIsNeverAcceptedRunsIntoTheLimit) {
-  const Testing::FullListener listener;
+  const FullListener listener;
   const std::string endpoint = "127.0.0.1:" + std::to_string(listener.Port());
   const HttpsClient client("http://" + endpoint + "/", nullptr, "", kTimeout, false);
   const std::string expected = "No answer from " + endpoint + " within 300 milliseconds.";
@@ -431,4 +435,4 @@ TEST_F(HttpsExchangeTest, NoFailureTellsWhatWasSent) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,0 +1,37 @@
+#include "transport/transport.h"
+
+#include <algorithm>
+#include <array>
+#include <new>
+#include <string>
+
+#include <gtest/gtest.h>
+
+namespace SsoClient::Testing {
+namespace {
+
+TEST(SoapRequestTest, HoldsTheActionAndThenTheBody) {
+  SoapRequest request;
+  request.action = "the action";
+  request.body = "the body";
+  const auto& [first, second] = request;
+  EXPECT_EQ(first, "the action");
+  EXPECT_EQ(second, "the body");
+}
+
+TEST(SoapRequestTest, CleansesItsBodyWhenItDies) {
+  const std::string secret = "hunter2-secret";  // short enough to stand in the string object itself
+  alignas(SoapRequest) std::array<unsigned char, sizeof(SoapRequest)> storage{};
+  auto* request = new (storage.data()) SoapRequest();
+  request->body = secret;
+  const auto holdsSecret = [&] {
+    return std::search(storage.begin(), storage.end(), secret.begin(), secret.end()) !=
+           storage.end();
+  };
+  EXPECT_TRUE(holdsSecret());
+  request->~SoapRequest();
+  EXPECT_FALSE(holdsSecret());
+}
+
+}  // namespace
+}  // namespace SsoClient::Testing
