@@ -24,7 +24,7 @@ using AllClasses = testing::Types<SsoException, CommunicationException, InvalidC
                                   InvalidSignatureException>;
 TYPED_TEST_SUITE(ExceptionClassTest, AllClasses);
 
-TYPED_TEST(ExceptionClassTest, CarriesItsMessage) {
+TYPED_TEST(ExceptionClassTest, HoldsItsMessage) {
   const TypeParam fault("what went wrong");
   EXPECT_EQ(fault.Message(), "what went wrong");
   EXPECT_STREQ(fault.what(), "what went wrong");
@@ -94,7 +94,7 @@ bool IsCaughtAs() {
   }
 }
 
-// The one class that a class derives from directly (Itanium C++ ABI, section 2.9.5).
+// The only direct base of a class (Itanium C++ ABI, section 2.9.5).
 const std::type_info& BaseOf(const std::type_info& derived) {
   return *dynamic_cast<const abi::__si_class_type_info&>(derived).__base_type;
 }

@@ -13,7 +13,7 @@
 
 #include "support/fake_saml_token.h"
 
-// Callers fill and take apart the records by position as well as by name, so the order of their
+// Callers initialise and unpack the records by position as well as by name, so the order of their
 // fields is part of the interface.
 namespace SsoClient::Testing {
 namespace {
@@ -73,7 +73,7 @@ TEST(TokenSpecTest, HoldsItsFieldsInOrder) {
   EXPECT_EQ(spec.confirmation, CONFIRMATION_BEARER);
 }
 
-TEST(TokenSpecTest, AsksForNothingUnlessTold) {
+TEST(TokenSpecTest, AsksForNothingByDefault) {
   const TokenSpec spec;
   EXPECT_EQ(spec.tokenLifetimeSec, 0);
   EXPECT_TRUE(spec.audienceRestriction.empty());
@@ -98,7 +98,7 @@ TEST(ConfirmationTypesTest, HaveTheirValuesIn32Bits) {
   EXPECT_EQ(HOLDER_OF_KEY, 1);
 }
 
-// Who owns one of these owns it through a shared handle, which knows the implementation.
+// They are owned by shared pointers, which destroy the implementation.
 TEST(InterfacesTest, HaveNoVirtualDestructor) {
   EXPECT_FALSE(std::has_virtual_destructor_v<SamlToken>);
   EXPECT_FALSE(std::has_virtual_destructor_v<SamlTokenFactory>);

@@ -9,8 +9,8 @@
 #include "transport/fake_http.h"
 #include "transport/fake_ssl.h"
 
-// Callers fill the records by position as well as by name, so the order of their fields is part of
-// the interface.
+// Callers initialise the records by position as well as by name, so the order of their fields is
+// part of the interface.
 namespace SsoClient::Testing {
 namespace {
 
@@ -50,7 +50,7 @@ TEST(SecurityTokenServiceConfigExTest, HoldsItsFieldsInOrder) {
   EXPECT_EQ(config.holderOfKeyConfig->privateKey, key.privateKey);
 }
 
-TEST(SecurityTokenServiceConfigTest, NamesNothingUnlessTold) {
+TEST(SecurityTokenServiceConfigTest, IsEmptyByDefault) {
   const SecurityTokenServiceConfig config;
   EXPECT_EQ(config.keyInfoResolver, nullptr);
   EXPECT_FALSE(config.holderOfKeyConfig.has_value());

@@ -1,4 +1,4 @@
-// Times that belong together come from one reading of the clock.
+// Times that belong together are computed from one reading of the clock.
 #include <gmock/gmock.h>
 
 #include "calls/recorded_calls.h"

@@ -1,4 +1,4 @@
-// What logs somebody in is not left behind in memory.
+// Secrets of a login do not remain in released memory.
 #include <memory>
 #include <numeric>
 #include <string>
@@ -34,7 +34,7 @@ std::string PartOf(const std::string& text) {
   return text.substr(text.size() / 2, 40);
 }
 
-/// Neither as it is nor in Base64.
+/// The leg as it is, or in Base64.
 class FreedLegTest : public testing::TestWithParam<bool> {
  protected:
   std::string Needle() const {
@@ -46,7 +46,7 @@ class FreedLegTest : public testing::TestWithParam<bool> {
   const RequestBuilderImpl builder_{boost::none};
 };
 
-TEST_P(FreedLegTest, TheTestSeesWhatIsLeft) {
+TEST_P(FreedLegTest, LeftoversAreDetected) {
   const FreedMemory memory(Needle());
   const auto copy = [this] {
     return GetParam() ? Tarnik::StringUtil::Base64Encode(leg_)
@@ -56,7 +56,7 @@ TEST_P(FreedLegTest, TheTestSeesWhatIsLeft) {
   EXPECT_EQ(memory.Finds(), 1);
 }
 
-TEST_P(FreedLegTest, IsNotLeftOfARequestThatBeginsANegotiation) {
+TEST_P(FreedLegTest, IsNotLeftByARequestThatBeginsANegotiation) {
   const FreedMemory memory(Needle());
   {
     SoapRequest request;
@@ -65,7 +65,7 @@ TEST_P(FreedLegTest, IsNotLeftOfARequestThatBeginsANegotiation) {
   EXPECT_EQ(memory.Finds(), 0);
 }
 
-TEST_P(FreedLegTest, IsNotLeftOfARequestThatContinuesANegotiation) {
+TEST_P(FreedLegTest, IsNotLeftByARequestThatContinuesANegotiation) {
   const FreedMemory memory(Needle());
   {
     SoapRequest request;
@@ -77,10 +77,10 @@ TEST_P(FreedLegTest, IsNotLeftOfARequestThatContinuesANegotiation) {
 INSTANTIATE_TEST_SUITE_P(Forms, FreedLegTest, testing::Bool(),
                          [](const auto& test) { return test.param ? "Base64" : "Bytes"; });
 
-/// Markup that stands in the text of a token alone.
+/// Markup that occurs only in the text of a token.
 constexpr char kTokenMarkup[] = "</saml2:Issuer><";
 
-TEST(FreedTokenTest, IsNotLeftOfANegotiationByLegs) {
+TEST(FreedTokenTest, IsNotLeftByANegotiationContext) {
   const auto transport =
       std::make_shared<FakeTransport>(LastLegAnswer(AssertionText().ToXml(), kLeg));
   InternalApi::GssNegotiationContextImpl context(
@@ -102,7 +102,7 @@ class QuietHandler final : public NegotiationHandler {
   }
 };
 
-TEST(FreedTokenTest, IsNotLeftOfAnAnswerWithoutAContext) {
+TEST(FreedTokenTest, IsNotLeftByAnAnswerWithoutAContext) {
   const auto transport =
       std::make_shared<FakeTransport>(LastLegAnswer(AssertionText().ToXml(), {}, ""));
   const SecurityTokenServiceImpl service(std::make_shared<RequestBuilderImpl>(boost::none),

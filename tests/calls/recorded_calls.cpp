@@ -73,7 +73,7 @@ void ForgetCalls() {
 
 }  // namespace SsoClient::Testing
 
-// From here on: the functions that stand in for the libraries' own. The linker takes them first.
+// From here on: the functions that replace those of the libraries. The linker finds these first.
 
 namespace SsoClient {
 

@@ -1,4 +1,4 @@
-// How the transport uses the platform, and who makes one with which limits.
+// How the transport uses the platform, and the limits that each of its users sets.
 #include "transport/https_client.h"
 
 #include <memory>
@@ -145,7 +145,8 @@ SecurityTokenServiceConfig ConfigWith(Tarnik::Ssl::SSLContext* sslContext, bool 
   return config;
 }
 
-// The fake agents answer nothing that the operations understand; what counts is how long they wait.
+// The fake agents return nothing that the operations understand; only the time that they wait
+// matters.
 
 TEST_F(TransportCallsTest, AServiceGivesEachExchange240SecondsAndHandsItsFlagOn) {
   for (const bool flag : {false, true}) {
@@ -166,7 +167,7 @@ TEST_F(TransportCallsTest, ANegotiationGivesEachLeg40SecondsOnOneSessionAndSetsN
   EXPECT_THAT(Recorded().log, ElementsAre("TLS spec: sts.example:8443, flag not set, peer 'peer'",
                                           "cookie store ''", kOwnAgent));
   EXPECT_EQ(Recorded().lastSslContext, sslContext_.get());
-  EXPECT_EQ(Recorded().lastSpec->RefCount(), 1);  // the client is gone, and the session goes on
+  EXPECT_EQ(Recorded().lastSpec->RefCount(), 1);  // the client is gone, and the session still works
   EXPECT_THROW(context->Negotiate({1}), Tarnik::Exception);
   EXPECT_THROW(context->Negotiate({1}), Tarnik::Exception);
   ASSERT_THAT(Recorded().agents, SizeIs(1));

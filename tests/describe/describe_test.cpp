@@ -19,7 +19,7 @@ namespace {
 
 using Tarnik::System::DateTime;
 
-// A token of set values that notes what it is asked for.
+// A token with settable values that records which functions are called.
 class FakeToken final : public SamlToken {
  public:
   const std::string& Id() const override { return text_; }
@@ -138,7 +138,7 @@ TEST(DescribeTest, WritesTheConfirmationTypeAsItsNumber) {
             "confirmationType=-12,audienceRestriction=, advice=[]");
 }
 
-TEST(DescribeTest, TellsAnEmptyDelegateFromNone) {
+TEST(DescribeTest, DistinguishesAnEmptyDelegateFromNone) {
   TokenSpec spec;
   spec.delegateTo = std::string();
   EXPECT_EQ(Describe(spec),
@@ -188,7 +188,7 @@ TEST(CreateSamlTokenDescriptionTest, AsksForEachValueOnceInItsOrder) {
                                       "IsSolution", "ConfirmationType"}));
 }
 
-TEST(CreateSamlTokenDescriptionTest, NeverTellsTheXml) {
+TEST(CreateSamlTokenDescriptionTest, NeverContainsTheXml) {
   EXPECT_EQ(CreateSamlTokenDescription(FakeToken()).find("SECRET"), std::string::npos);
 }
 

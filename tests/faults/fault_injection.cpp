@@ -66,7 +66,7 @@ void operator delete(void* memory, std::size_t) noexcept {
   std::free(memory);
 }
 
-// The linker sends the calls of the libraries under test here (its option --wrap).
+// The linker redirects the calls of the libraries under test to these functions (option --wrap).
 extern "C" {
 
 void* __wrap_malloc(std::size_t size) {

@@ -3,15 +3,15 @@
 
 #include <cstddef>
 
-/// Makes one call of a kind fail: an allocation by operator new or by the library's own malloc,
-/// which Expat's memory comes from, or a call of OpenSSL's that digests, verifies or signs. For one
+/// Makes one call of a kind fail: an allocation by operator new or by the library's calls of
+/// malloc, which supply Expat's memory, or an OpenSSL call that digests, verifies or signs. For one
 /// thread at a time.
 namespace SsoClient::Testing {
 
 enum class FaultKind { kAllocation, kCrypto };
 
-/// From its making to its end, the call of `kind` with this index (counted from 0) fails; one of
-/// crypto gives `result`.
+/// During its lifetime the call of `kind` with this index (counted from 0) fails; a crypto call
+/// returns `result`.
 class InjectedFault {
  public:
   InjectedFault(FaultKind kind, std::size_t index, int result = 0) noexcept;
@@ -19,7 +19,7 @@ class InjectedFault {
   InjectedFault(const InjectedFault&) = delete;
   InjectedFault& operator=(const InjectedFault&) = delete;
 
-  /// False when there were fewer calls.
+  /// False if there were fewer calls.
   bool HasHappened() const noexcept;
 };
 

@@ -15,8 +15,8 @@
 #include "faults/fault_injection.h"
 #include "support/parse_xml.h"
 
-// One call fails in the midst of making a signature: it is blank again, and signing it once more
-// gives what a judge accepts.
+// One call fails while a signature is made: the signature is blank again, and signing it once more
+// gives a signature that an independent verifier accepts.
 namespace SsoClient::Testing {
 namespace {
 
@@ -39,7 +39,7 @@ class SigningFaultsTest : public testing::Test {
  protected:
   SigningFaultsTest() : signer_(MakeSigner()) {
     key_ = CreatePrivateKeyFromPem(signer_.privateKeyPem);
-    // What is set up once for a key or in the process is not under test.
+    // What is set up once per key or per process is not under test.
     Prepare();
     EXPECT_EQ(Sign(), Outcome::kSigned);
   }
@@ -73,7 +73,7 @@ class SigningFaultsTest : public testing::Test {
     }
   }
 
-  /// Signs with each call of `kind` failing in its turn; gives the number of them.
+  /// Signs with each call of `kind` failing in turn; returns the number of calls.
   std::size_t FailEachCall(FaultKind kind, int result, Outcome expected) {
     for (std::size_t index = 0;; ++index) {
       Prepare();
@@ -114,8 +114,8 @@ TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenTheCryptographicLibraryFails) 
   }
 }
 
-// Each construction step fails in turn: nothing leaks, and nothing half made is handed out.
-TEST_F(SigningFaultsTest, LeaveNothingBehindWhenASignatureIsBegun) {
+// Each construction step fails in turn: nothing leaks, and no partly built object is returned.
+TEST_F(SigningFaultsTest, LeakNothingWhenASignatureCannotBeBegun) {
   std::size_t failures = 0;
   for (bool happened = true; happened; ++failures) {
     Ref<Signature> made;

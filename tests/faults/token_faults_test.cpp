@@ -13,8 +13,8 @@
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
 
-// One call fails in the midst of reading and verifying a token: a forged one is never accepted, a
-// good one never for the wrong reason, and nothing leaks.
+// One call fails while a token is read and verified: a forged token is never accepted, a good one
+// is never accepted for the wrong reason, and nothing leaks.
 namespace SsoClient::Testing {
 namespace {
 
@@ -22,7 +22,7 @@ using Tarnik::Xml::Security::KeyInfoResolver;
 
 enum class Verdict { kAccepted, kRefused, kOutOfMemory };
 
-Verdict Judge(const std::string& xml, const KeyInfoResolver* resolver) {
+Verdict VerdictOn(const std::string& xml, const KeyInfoResolver* resolver) {
   try {
     CreateSamlToken(xml, resolver);
     return Verdict::kAccepted;
@@ -47,8 +47,8 @@ std::vector<Forgery> Forgeries() {
 
 class TokenFaultsTest : public testing::Test {
  protected:
-  // What is set up once in the process is not under test.
-  void SetUp() override { ASSERT_EQ(Judge(original_, resolver_.get()), Verdict::kAccepted); }
+  // What is set up once per process is not under test.
+  void SetUp() override { ASSERT_EQ(VerdictOn(original_, resolver_.get()), Verdict::kAccepted); }
 
   const std::string original_ = OriginalAssertion();
   const Tarnik::Ref<const KeyInfoResolver> resolver_ = TrustedResolver();
@@ -60,7 +60,7 @@ TEST_F(TokenFaultsTest, GoodTokenIsReadOrMemoryIsOut) {
     Verdict verdict;
     {
       const InjectedFault fault(FaultKind::kAllocation, failures);
-      verdict = Judge(original_, resolver_.get());
+      verdict = VerdictOn(original_, resolver_.get());
       happened = fault.HasHappened();
     }
     ASSERT_EQ(verdict, happened ? Verdict::kOutOfMemory : Verdict::kAccepted) << failures;
@@ -74,7 +74,7 @@ TEST_F(TokenFaultsTest, ForgedTokenIsNeverAcceptedWhenMemoryIsOut) {
     std::size_t failures = 0;
     for (bool happened = true; happened; ++failures) {
       const InjectedFault fault(FaultKind::kAllocation, failures);
-      const Verdict verdict = Judge(forgery.xml, resolver_.get());
+      const Verdict verdict = VerdictOn(forgery.xml, resolver_.get());
       happened = fault.HasHappened();
       ASSERT_EQ(verdict, happened ? Verdict::kOutOfMemory : Verdict::kRefused)
           << forgery.name << " " << failures;
@@ -89,7 +89,7 @@ TEST_P(CryptoFaultsTest, AreNeverTakenForAGoodSignature) {
   std::size_t calls = 0;
   for (bool happened = true; happened; ++calls) {
     const InjectedFault fault(FaultKind::kCrypto, calls, GetParam());
-    const Verdict verdict = Judge(original_, resolver_.get());
+    const Verdict verdict = VerdictOn(original_, resolver_.get());
     happened = fault.HasHappened();
     ASSERT_EQ(verdict, happened ? Verdict::kRefused : Verdict::kAccepted) << calls;
   }
@@ -102,7 +102,7 @@ TEST_P(CryptoFaultsTest, DoNotHelpAForgery) {
     std::size_t calls = 0;
     for (bool happened = true; happened; ++calls) {
       const InjectedFault fault(FaultKind::kCrypto, calls, GetParam());
-      ASSERT_EQ(Judge(forgery.xml, resolver_.get()), Verdict::kRefused)
+      ASSERT_EQ(VerdictOn(forgery.xml, resolver_.get()), Verdict::kRefused)
           << forgery.name << " " << calls;
       happened = fault.HasHappened();
     }

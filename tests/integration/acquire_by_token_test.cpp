@@ -1,4 +1,4 @@
-// Tokens on the strength of another one: plain, handed on, and on behalf of somebody.
+// Tokens acquired with another token: plain, delegated, and on behalf of another user.
 #include <memory>
 #include <set>
 #include <string>
@@ -112,7 +112,7 @@ TEST_F(AcquireByTokenTest, ActsForTheSubjectAndHandsItOn) {
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine", "bob"));
 }
 
-TEST_F(AcquireByTokenTest, ADelegateActsWithoutStandingInTheChainTwice) {
+TEST_F(AcquireByTokenTest, ADelegateActsWithoutAppearingInTheChainTwice) {
   const auto delegated = Acquire(DelegatedTo("machine@EXAMPLE.COM"));
   const auto token = ByToken(*MachineToken(), OnBehalfOf(delegated));
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine"));
@@ -130,7 +130,7 @@ TEST_F(AcquireByTokenTest, NobodyActsForASubjectThatDidNotAllowIt) {
   EXPECT_THAT(Sts().LastRequest().answeredFault, HasSubstr("may not be delegated to machine@"));
 }
 
-// What was delegated in an earlier life of a token stays with it when it is renewed.
+// A renewed token keeps the delegations of the token before it.
 TEST_F(AcquireByTokenTest, RenewalKeepsTheChain) {
   const auto delegated = ByToken(*AcquireBound(), DelegatedTo("bob@EXAMPLE.COM"));
   EXPECT_THAT(ChainOf(*HolderService()->RenewToken(*delegated, 60)), ElementsAre("bob"));

@@ -43,7 +43,7 @@ TEST_F(AcquireTokenTest, WorksOverPlainHttpWithoutTlsTrust) {
   EXPECT_EQ(token->Subject().name, "alice");
 }
 
-TEST_F(AcquireTokenTest, TokenCarriesNamesAndGroupsOfTheSubject) {
+TEST_F(AcquireTokenTest, TokenHasNamesAndGroupsOfTheSubject) {
   const auto token = Acquire();
   SubjectNames names;
   token->GetSubjectNames(names);
@@ -121,7 +121,7 @@ TEST_F(AcquireTokenTest, MarkupAndForeignLettersReachTheServiceUnchanged) {
   EXPECT_EQ(token->Subject().name, "j\xC3\xBCrgen&co");
 }
 
-TEST_F(AcquireTokenTest, RequestIsTheStatedPost) {
+TEST_F(AcquireTokenTest, RequestIsTheExpectedPost) {
   Acquire();
   const auto request = Sts().LastRequest();
   EXPECT_EQ(request.method, "POST");
@@ -143,7 +143,7 @@ TEST_F(AcquireTokenTest, PathAndQueryOfTheUrlAreTheRequestTarget) {
   EXPECT_EQ(Sts().LastRequest().target, "/path/to/sts?tenant=one");
 }
 
-TEST_F(AcquireTokenTest, SslPeerNameStandsForTheHost) {
+TEST_F(AcquireTokenTest, SslPeerNameReplacesTheHost) {
   SecurityTokenServiceConfig config;
   const auto sslContext = TrustCa(Sts());
   config.url = Sts().HttpsUrl();

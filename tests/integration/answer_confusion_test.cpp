@@ -1,4 +1,4 @@
-// Answers that belong to another operation, and answers that were changed on their way.
+// Answers that belong to another operation, and answers that were changed in transit.
 #include <memory>
 #include <optional>
 #include <string>
@@ -28,7 +28,7 @@ class AnswerConfusionTest : public HolderOfKeyTest,
   }
 };
 
-// Of the four operations that bring a token, three are answered in the same way.
+// Three of the four operations that return a token have the same kind of answer.
 bool IsAnsweredAlike(Operation one, Operation other) {
   const auto issues = [](Operation operation) {
     return operation != Operation::Renew && operation != Operation::Validate;
@@ -69,8 +69,8 @@ struct VerdictCase {
 
 class VerdictTextTest : public HolderOfKeyTest, public testing::WithParamInterface<VerdictCase> {};
 
-// A verdict is one of two URIs as they stand; whatever resembles one is none.
-TEST_P(VerdictTextTest, IsNoVerdict) {
+// A verdict is exactly one of two URIs; anything similar is not a verdict.
+TEST_P(VerdictTextTest, IsNotAVerdict) {
   Arguments arguments;
   arguments.token = AcquireBound();
   DevSts::Misbehavior misbehavior;

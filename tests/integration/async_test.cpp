@@ -17,7 +17,7 @@ namespace {
 
 class AsyncTest : public StsTest {};
 
-/// What a callback received, kept beyond the call.
+/// What a callback received, kept after the call.
 struct Outcome {
   std::shared_ptr<const SamlToken> token;
   std::unique_ptr<Tarnik::Throwable> error;
@@ -59,7 +59,7 @@ TEST_F(AsyncTest, FailureReachesTheCallbackWithItsExactClass) {
 }
 
 TEST_F(AsyncTest, ArgumentErrorsReachTheCallbackToo) {
-  // Shared, here and below: the callback may still be leaving when the result is here.
+  // Shared, here and below: the callback may not have returned yet when the result is available.
   const auto promise = std::make_shared<std::promise<std::string>>();
   Service()->AcquireTokenAsync(
       kUser, kPassword, TokenSpec{},

@@ -34,7 +34,7 @@ class TemporaryFile {
   std::string path_;
 };
 
-/// Runs the program and returns what waitpid tells of its end.
+/// Runs the program and returns the status from waitpid.
 int RunToEnd(std::vector<std::string> command) {
   std::vector<char*> arguments;
   for (auto& word : command) {

@@ -1,4 +1,4 @@
-// The asynchronous twins of all operations.
+// The asynchronous variants of all operations.
 #include <atomic>
 #include <chrono>
 #include <functional>
@@ -29,7 +29,7 @@ using testing::StartsWith;
 
 constexpr std::chrono::seconds kPatience{120};
 
-/// What came, or a failure if nothing does.
+/// The outcome; throws if none arrives in time.
 Outcome Await(std::future<Outcome>& future) {
   if (future.wait_for(kPatience) != std::future_status::ready) {
     throw std::runtime_error("the callback was never called");
@@ -119,14 +119,14 @@ TEST_P(EveryOperationAsyncTest, EmptyCallbackIsRefusedAtTheCall) {
 INSTANTIATE_TEST_SUITE_P(Operations, EveryOperationAsyncTest, testing::ValuesIn(kOperations),
                          [](const auto& tested) { return NameOf(tested.param); });
 
-/// Something that goes wrong.
+/// One way to fail.
 struct Trouble {
   const char* name;
   std::type_index errorClass;
   /// How the message begins; the rest is compared with that of the synchronous operation.
   const char* message;
   void (*prepare)(DevSts::Server& server, Arguments& arguments);
-  /// Operations that it does not concern succeed.
+  /// Operations that it does not affect succeed.
   bool concernsVerdicts = true;
   bool concernsRenewal = true;
 };
@@ -152,7 +152,7 @@ void EditTokens(DevSts::Server& server, std::function<void(std::string&)> edit) 
   server.SetAssertionOptions(options);
 }
 
-/// Puts another text in the place of the certificate that a token is bound to.
+/// Replaces the certificate that a token is bound to with another text.
 void EditHolderCertificate(DevSts::Server& server, const std::string& text) {
   EditTokens(server, [text](std::string& xml) {
     constexpr std::string_view kElement = "<ds:X509Certificate>";
@@ -279,7 +279,7 @@ TEST_F(HolderOfKeyAsyncTest, InvalidStateReachesTheCallback) {
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
-TEST_F(HolderOfKeyAsyncTest, VerdictThatATokenIsNotValidIsNoError) {
+TEST_F(HolderOfKeyAsyncTest, VerdictThatATokenIsNotValidIsNotAnError) {
   Arguments arguments;
   arguments.token = AcquireBound();
   Sts().Revoke(arguments.token->Id());
@@ -300,7 +300,7 @@ TEST_F(HolderOfKeyAsyncTest, ThousandMixedCallsInFlightAllComplete) {
   std::vector<std::future<Outcome>> futures;
   futures.reserve(kCalls);
   for (int i = 0; i < kCalls; ++i) {
-    // Every twentieth is an error before it is sent, or a refusal of the service.
+    // Every twentieth call fails before it is sent, and every twentieth is refused by the service.
     Arguments changed = arguments;
     changed.password = i % 20 == 0 ? "wrong-secret" : kPassword;
     changed.spec.tokenLifetimeSec = i % 20 == 1 ? 0 : 600;

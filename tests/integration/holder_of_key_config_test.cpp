@@ -1,4 +1,4 @@
-// Configurations that cannot work, told when a service is made or when it is to sign.
+// Unusable configurations, reported when a service is created or when it signs.
 #include <chrono>
 #include <memory>
 #include <string>
@@ -167,7 +167,7 @@ INSTANTIATE_TEST_SUITE_P(
                     PeriodCase{"JustAhead", seconds(660), hours(1), "is not valid before "}),
     [](const auto& tested) { return tested.param.name; });
 
-// Clocks differ, so the service has the last word shortly before and after.
+// Clocks differ, so shortly before and after the period the service decides.
 class NearPeriodTest : public CertificatePeriodTest {};
 
 TEST_P(NearPeriodTest, IsLeftToTheService) {

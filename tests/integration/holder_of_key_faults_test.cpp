@@ -1,4 +1,4 @@
-// What the service refuses of a holder-of-key operation, as the caller sees it.
+// How refusals of holder-of-key operations by the service reach the caller.
 #include <chrono>
 #include <memory>
 #include <optional>
@@ -28,7 +28,7 @@ class HolderOfKeyFaultTest : public HolderOfKeyTest {
     EXPECT_EQ(outcome.message, message);
     EXPECT_EQ(outcome.token, nullptr);
   }
-  /// The service tells why in its fault, and the caller reads it.
+  /// The service gives the reason in its fault, and the caller sees it.
   static void ExpectRejected(const Outcome& outcome, const std::string& fault) {
     ExpectFailure(outcome, typeid(InvalidCredentialsException), "Authentication failed: " + fault);
   }
@@ -56,7 +56,7 @@ TEST_F(HolderOfKeyFaultTest, UnknownCertificateIsNobodys) {
                  "The certificate is nobody's");
 }
 
-TEST_F(HolderOfKeyFaultTest, ProvenKeyDoesNotStandForThePassword) {
+TEST_F(HolderOfKeyFaultTest, ProvenKeyDoesNotReplaceThePassword) {
   Arguments arguments;
   arguments.password = "wrong-secret";
   ExpectRejected(CallNow(Operation::Password, *HolderService(), arguments), "Invalid credentials");
@@ -142,7 +142,7 @@ TEST_F(HolderOfKeyFaultTest, TokenThatHasNotBegunIsRefused) {
 
 TEST_F(HolderOfKeyFaultTest, AnotherKeyThanTheTokensIsRefused) {
   const auto token = AcquireBound();
-  // The token names the key to verify with, and the request is not signed by that one.
+  // The token names the verification key, and the request is signed with another one.
   ExpectUnexpectedFault(Present(Operation::Token, token, Stranger()), "wsse:FailedCheck");
   ExpectRejected(Present(Operation::Renew, token, Stranger()),
                  "The request is not signed by the key of the RenewTarget");
@@ -207,7 +207,7 @@ TEST_F(HolderOfKeyFaultTest, WhatIsNotDelegableIsNotDelegated) {
                         "wst:InvalidRequest");
 }
 
-/// A fault of any kind, as answered to each operation.
+/// A fault of any kind, returned to each operation.
 struct FaultCase {
   const char* name;
   const char* codeNamespace;

@@ -12,13 +12,13 @@
 
 namespace SsoClient::Testing {
 
-/// A solution user of the dev STS, known by the certificate of `Holder()` too.
+/// A solution user of the dev STS, also known by the certificate of `Holder()`.
 inline constexpr char kMachine[] = "machine@EXAMPLE.COM";
 inline constexpr char kMachinePassword[] = "machine-secret";
 
 /// The client's RSA key and certificate.
 const DevSts::Credential& Holder();
-/// Others, which belong to nobody.
+/// Another key and certificate, which belong to no user.
 const DevSts::Credential& Stranger();
 
 /// A new RSA certificate of the key of `Holder()`, valid between these times from now.
@@ -42,7 +42,7 @@ std::vector<std::string> ChainOf(const SamlToken& token);
 /// True when the token is bound to the credential's certificate, octet for octet.
 bool IsBoundTo(const SamlToken& token, const DevSts::Credential& credential);
 
-/// Tokens of these options begin and end at these times from now, whatever is asked for.
+/// With these options tokens begin and end at these times from now, whatever is requested.
 DevSts::AssertionOptions ValidBetween(std::chrono::seconds start, std::chrono::seconds end);
 
 class HolderOfKeyTest : public StsTest {

@@ -66,7 +66,7 @@ TEST_F(LogTest, FailureStillWritesTheEndLine) {
   EXPECT_EQ(lines_.back(), (Line{7, "END operation SecurityTokenServiceImpl::AcquireToken"}));
 }
 
-TEST_F(LogTest, LevelFiveShowsTheTokenAlone) {
+TEST_F(LogTest, LevelFiveShowsOnlyTheToken) {
   Tarnik::Service::SetLogLevel("SsoClient", 5);
   Acquire();
   ASSERT_EQ(lines_.size(), 1U);

@@ -15,7 +15,7 @@
 
 namespace SsoClient::Testing {
 
-/// The operations of a service, for tests that are about all of them.
+/// The operations of a service, for tests of all of them.
 enum class Operation { Password, Certificate, Token, Renew, Validate };
 
 inline constexpr Operation kOperations[] = {Operation::Password, Operation::Certificate,
@@ -26,7 +26,7 @@ inline constexpr Operation kOperations[] = {Operation::Password, Operation::Cert
 const char* NameOf(Operation operation);
 std::ostream& operator<<(std::ostream& stream, Operation operation);
 
-/// Arguments for any operation, which takes its part of them. Renewal takes the spec's lifetime.
+/// Arguments for any operation; each uses the ones it needs. Renewal uses the spec's lifetime.
 struct Arguments {
   TokenSpec spec = TenMinutes();
   std::shared_ptr<const SamlToken> token;
@@ -48,7 +48,7 @@ struct Outcome {
 Outcome CallNow(Operation operation, const SecurityTokenService& service,
                 const Arguments& arguments);
 
-/// Starts the asynchronous twin. `arguments.token` stays alive until the callback has run.
+/// Starts the asynchronous operation. `arguments.token` stays alive until the callback has run.
 std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& service,
                                const Arguments& arguments);
 

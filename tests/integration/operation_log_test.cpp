@@ -1,4 +1,4 @@
-// What each operation writes into the log, and what never stands there.
+// What each operation writes to the log, and what never appears there.
 #include <cstddef>
 #include <functional>
 #include <stdexcept>
@@ -38,7 +38,7 @@ std::string Acquired(const Outcome& outcome) {
   return "5 Successfully acquired token: " + CreateSamlTokenDescription(*outcome.token);
 }
 
-/// The line that tells of the arguments.
+/// The line that describes the arguments.
 std::string RequestLine(Operation operation, const Arguments& arguments) {
   const std::string presented = CreateSamlTokenDescription(*arguments.token);
   const std::string spec = std::string("`") + kSpecText + "'";
@@ -81,7 +81,7 @@ TEST_P(OperationLogTest, SuccessWritesItsLinesInOrder) {
   }
 }
 
-TEST_P(OperationLogTest, LevelsFiveAndSixTellOnlyOfAnAcquiredToken) {
+TEST_P(OperationLogTest, LevelsFiveAndSixLogOnlyAnAcquiredToken) {
   const auto service = HolderService();
   for (const int level : {5, 6}) {
     const LogCapture log(level);
@@ -128,7 +128,7 @@ TEST_P(OperationLogTest, LocalFailureStillWritesTheEndLine) {
   EXPECT_EQ(lines.back(), Ended(GetParam()));
 }
 
-TEST_P(OperationLogTest, AsynchronousTwinWritesTheSameLines) {
+TEST_P(OperationLogTest, AsynchronousOperationWritesTheSameLines) {
   const auto service = HolderService();
   const LogCapture log(7);
   ASSERT_TRUE(CallAsync(GetParam(), *service, arguments_).get().IsSuccess());
@@ -157,8 +157,8 @@ std::string Between(const std::string& text, const std::string& start, const std
   return text.substr(begin, text.find(end, begin) - begin);
 }
 
-/// Pieces of everything that must not be told: of the password, the private key, and of the text of
-/// every token that took part.
+/// Pieces of everything that must stay secret: the password, the private key and the text of every
+/// token that took part.
 std::vector<std::string> SecretsOf(const Arguments& arguments, const Outcome& outcome) {
   std::vector<std::string> secrets = {arguments.password, "PRIVATE KEY", "<saml2", "<wsse"};
   const std::string pem = Holder().privateKeyPem;
@@ -175,10 +175,10 @@ std::vector<std::string> SecretsOf(const Arguments& arguments, const Outcome& ou
   return secrets;
 }
 
-/// How an operation ends, where that is the same for all of them.
+/// How an operation ends, if that is the same for all of them.
 enum class End { Success, Failure, Either };
 
-/// What a request or an answer met on its way.
+/// What happens to a request or an answer in transit.
 struct Mishap {
   const char* name;
   End end;

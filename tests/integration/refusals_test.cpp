@@ -37,14 +37,14 @@ TEST_F(RefusalTest, UnknownUserIsInvalidCredentials) {
   EXPECT_EQ(message, "Authentication failed: Invalid credentials");
 }
 
-TEST_F(RefusalTest, ExpiredPasswordIsToldApart) {
+TEST_F(RefusalTest, ExpiredPasswordHasItsOwnException) {
   const std::string message = MessageOf<PasswordExpiredException>(
       [] { Service()->AcquireToken("expired@EXAMPLE.COM", "expired-secret", TenMinutes()); });
   EXPECT_THAT(message,
               StartsWith("Authentication failed: Password of the user logging on is expired"));
 }
 
-TEST_F(RefusalTest, ExpiryTextBehindOtherWordsIsNotAnExpiredPassword) {
+TEST_F(RefusalTest, ExpiryTextAfterOtherWordsIsNotAnExpiredPassword) {
   DevSts::Misbehavior misbehavior;
   misbehavior.fault =
       DevSts::FaultAnswer{kTrust, "FailedAuthentication",
@@ -105,7 +105,7 @@ INSTANTIATE_TEST_SUITE_P(
                     StatusCase{308, "Permanent Redirect"}, StatusCase{300, "Multiple Choices"},
                     StatusCase{401, "Unauthorized"}, StatusCase{502, "Bad Gateway"}));
 
-TEST_F(RefusalTest, GarbageInsteadOfXmlIsToldApart) {
+TEST_F(RefusalTest, GarbageInsteadOfXmlHasItsOwnMessage) {
   DevSts::Misbehavior misbehavior;
   misbehavior.httpAnswer = DevSts::HttpAnswer{200, "OK", {}, "this is no XML"};
   Sts().SetMisbehavior(misbehavior);
@@ -113,7 +113,7 @@ TEST_F(RefusalTest, GarbageInsteadOfXmlIsToldApart) {
               StartsWith("Response is not well-formed XML: "));
 }
 
-TEST_F(RefusalTest, XmlThatIsNoAnswerIsRefused) {
+TEST_F(RefusalTest, XmlThatIsNotAnAnswerIsRefused) {
   DevSts::Misbehavior misbehavior;
   misbehavior.httpAnswer = DevSts::HttpAnswer{200, "OK", {}, "<html><p/></html>"};
   Sts().SetMisbehavior(misbehavior);
@@ -130,7 +130,7 @@ TEST_F(RefusalTest, GarbageInsteadOfHttpIsACommunicationFailure) {
 }
 
 TEST_F(RefusalTest, NobodyListens) {
-  // A port that was free a moment ago and that nobody listens on.
+  // A port that was free a moment ago and that no process listens on.
   const int probe = socket(AF_INET, SOCK_STREAM, 0);
   sockaddr_in address{};
   address.sin_family = AF_INET;

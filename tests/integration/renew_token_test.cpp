@@ -79,7 +79,7 @@ TEST_F(RenewTokenTest, TokenThatIsNotRenewableIsRefusedByTheService) {
   EXPECT_EQ(RefusalOf(*AcquireBound(TenMinutes())), "The RenewTarget is not renewable");
 }
 
-// The client asks for a lifetime that begins now, so this right is not used, but handed on.
+// The client requests a lifetime that begins now, so this right is not used, but passed on.
 TEST_F(RenewTokenTest, PostdatableTokenBeginsNowAndStaysPostdatable) {
   for (const bool postdatable : {false, true}) {
     DevSts::AssertionOptions options;
@@ -99,7 +99,7 @@ TEST_F(RenewTokenTest, TokenThatHasNotBegunIsRefused) {
   EXPECT_EQ(RefusalOf(*AcquireBound()), "The RenewTarget is not yet valid");
 }
 
-// Within the client's tolerance of ten minutes an expired token still is a token.
+// Within the client's tolerance of ten minutes an expired token is still accepted.
 TEST_F(RenewTokenTest, ExpiredTokenIsRenewedIfItsRestrictionSaysSo) {
   for (const bool renewExpired : {false, true}) {
     DevSts::AssertionOptions options = ValidBetween(seconds(-100), seconds(-10));

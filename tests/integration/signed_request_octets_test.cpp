@@ -1,4 +1,4 @@
-// Signed requests as they arrive, judged by another implementation of XML signatures.
+// Signed requests as they arrive, verified by another implementation of XML signatures.
 #include <memory>
 #include <set>
 #include <stdexcept>
@@ -19,7 +19,7 @@ namespace {
 using testing::ElementsAre;
 using testing::StartsWith;
 
-/// Where a text travels in a signed request.
+/// The place of a text in a signed request.
 enum class Place { UserName, Password, Audience, AdviceSource, AdviceName, AdviceValue, Delegate };
 
 struct TextCase {
@@ -63,7 +63,7 @@ Arguments ArgumentsWith(Place place, const std::string& text) {
   return arguments;
 }
 
-/// The text as the issued token tells it, where it tells it.
+/// The text as the issued token returns it, if it does.
 std::string TextOf(Place place, const SamlToken& token, const Arguments& arguments) {
   std::set<std::string> audiences;
   token.GetAudiences(audiences);
@@ -89,7 +89,7 @@ std::string TextOf(Place place, const SamlToken& token, const Arguments& argumen
   return {};
 }
 
-// The request's own signature stands first in its envelope, unless an assertion stands in the
+// The request's own signature is the first in its envelope, unless there is an assertion in the
 // header.
 void ExpectVerifies(const std::string& body) {
   const DevSts::VerifyResult result = DevSts::VerifyXml(body, Holder().certificatePem);
@@ -154,10 +154,12 @@ INSTANTIATE_TEST_SUITE_P(
       return std::string(std::get<0>(tested.param).name) + std::get<1>(tested.param).name;
     });
 
-/// Requests that an assertion travels in: as the act-as token, as the presented one, as the target.
+/// Requests that contain an assertion: as the act-as token, as the presented token, or as the
+/// target.
 class TravellingTokenTest : public HolderOfKeyTest, public testing::WithParamInterface<TextCase> {
  protected:
-  /// The assertion in the last request still is what its issuer signed, on its own.
+  /// The assertion in the last request is still valid as its issuer signed it when taken out of the
+  /// request.
   static void ExpectIntact(const SamlToken& token) {
     const std::string sent = AssertionIn(Sts().LastRequest().body);
     const std::string signer = Sts().SigningCertificatePem();
@@ -218,8 +220,9 @@ TEST_P(TravellingTokenTest, IsValidated) {
   }
 }
 
-// Two assertions in one request: the presented one proves the key, the other is acted for.
-TEST_P(TravellingTokenTest, IsPresentedBesideAnActAsToken) {
+// Two assertions in one request: the presented one proves the key, the other names the subject to
+// act for.
+TEST_P(TravellingTokenTest, IsPresentedTogetherWithAnActAsToken) {
   const auto token = AcquireBound(Talkative());
   TokenSpec spec = TenMinutes();
   spec.actAsToken = TalkativeBearer();

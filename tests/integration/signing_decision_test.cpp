@@ -1,4 +1,4 @@
-// What each operation signs and asks for, judged from the octets that arrive.
+// What each operation signs and requests, checked in the octets that arrive.
 #include <string>
 #include <typeindex>
 #include <typeinfo>
@@ -22,7 +22,7 @@ using Names = std::vector<std::string>;
 
 constexpr char kProof[] = "holderOfKeyProofSignature";
 
-/// What arrives, or why nothing does.
+/// What arrives, or why nothing arrives.
 struct Expected {
   Names securityEntries;
   std::string keyType;
@@ -75,8 +75,8 @@ class SigningDecisionTest : public HolderOfKeyTest, public testing::WithParamInt
   }
 };
 
-// What the service says to a request that asks for a bound token without proving the key: the spec
-// acts as another, whose requests by password are not signed.
+// The service refuses a request for a bound token that does not prove the key: requests by password
+// are not signed if the spec has an act-as token.
 bool IsRefusedByTheService(const Cell& cell) {
   return cell.operation == Operation::Password && cell.expected.keyType == "PublicKey" &&
          cell.actsAs;
@@ -110,7 +110,7 @@ void ExpectOutcome(const Cell& cell, const Outcome& outcome) {
   EXPECT_EQ(outcome.token->ConfirmationType(), isBound ? HOLDER_OF_KEY : BEARER);
 }
 
-TEST_P(SigningDecisionTest, IsTheStatedOne) {
+TEST_P(SigningDecisionTest, IsTheExpectedOne) {
   const Cell& cell = GetParam();
   const Arguments arguments = ArgumentsOf(cell);
   const auto service = cell.hasKey ? HolderService() : Service();
@@ -193,7 +193,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 class LocalCheckTest : public HolderOfKeyTest {};
 
-TEST_F(LocalCheckTest, LifetimeIsJudgedFirstAndNothingIsSent) {
+TEST_F(LocalCheckTest, LifetimeIsCheckedFirstAndNothingIsSent) {
   Arguments arguments;
   arguments.token = Acquire();
   arguments.spec.confirmation = CONFIRMATION_BEARER;

@@ -18,18 +18,18 @@ inline constexpr char kPassword[] = "secret";
 /// TLS trust in the CA of `server`.
 Tarnik::Ref<Tarnik::Ssl::SSLContext> TrustCa(const DevSts::Server& server);
 
-/// A resolver that trusts the first certificate of `pem` alone.
+/// A resolver that trusts only the first certificate of `pem`.
 Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> TrustSigner(const std::string& pem);
 
 /// A service for `url` that trusts `server`'s CA and signing key.
 std::shared_ptr<SecurityTokenService> MakeService(const DevSts::Server& server,
                                                   const std::string& url);
 
-/// A spec for ten minutes, nothing else asked for.
+/// A spec for ten minutes that requests nothing else.
 TokenSpec TenMinutes();
 
-/// The message of the `Expected` that `action` throws; another exception passes through, none fails
-/// the test.
+/// The message of the `Expected` that `action` throws. Another exception passes through; the test
+/// fails if nothing is thrown.
 template <class Expected, class Action>
 std::string MessageOf(Action&& action) {
   try {

@@ -1,4 +1,4 @@
-// Assertions of other shapes keep their signatures when they travel in requests.
+// Assertions of other shapes keep valid signatures when they are sent in requests.
 #include <memory>
 #include <string>
 #include <utility>
@@ -94,7 +94,7 @@ INSTANTIATE_TEST_SUITE_P(
                           }}),
     [](const auto& tested) { return tested.param.name; });
 
-/// Ways in which a caller may come by a token other than as the answer of this service.
+/// Tokens that a caller has from other places than the answer of this service.
 class KeptTokenTest : public HolderOfKeyTest {
  protected:
   static void ExpectAccepted(std::shared_ptr<const SamlToken> token) {

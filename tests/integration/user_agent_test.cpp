@@ -1,4 +1,4 @@
-// Holder-of-key operations over a user agent and connections of the caller's.
+// Holder-of-key operations over the caller's user agent and connections.
 #include <chrono>
 #include <cstdint>
 #include <future>

@@ -16,7 +16,7 @@ using testing::HasSubstr;
 
 class ValidateSubjectTest : public HolderOfKeyTest {
  protected:
-  // With and without a holder-of-key configuration: it must not matter.
+  // With and without a holder-of-key configuration, which must make no difference.
   static bool IsValid(const SamlToken& token) {
     const bool verdict = Service()->ValidateSubject(token);
     EXPECT_EQ(HolderService()->ValidateSubject(token), verdict);
@@ -62,7 +62,7 @@ TEST_F(ValidateSubjectTest, ForgedTokenIsNotValid) {
   EXPECT_FALSE(IsValid(*CreateSamlToken(xml)));
 }
 
-TEST_F(ValidateSubjectTest, RequestIsTheStatedOne) {
+TEST_F(ValidateSubjectTest, RequestIsTheExpectedOne) {
   const auto token = AcquireBound();
   HolderService()->ValidateSubject(*token);
   const auto request = Sts().LastRequest();

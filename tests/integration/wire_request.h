@@ -6,7 +6,7 @@
 
 namespace SsoClient::Testing {
 
-/// What tells requests apart, read from the octets that a server received.
+/// What distinguishes requests, read from the octets that a server received.
 struct WireRequest {
   /// Local names of the entries of the Security header, in order.
   std::vector<std::string> securityEntries;

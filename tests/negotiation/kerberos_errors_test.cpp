@@ -1,4 +1,4 @@
-// A login that Kerberos refuses tells why in Kerberos' own words, and nothing is sent.
+// If Kerberos refuses a login, the exception has the message of Kerberos, and nothing is sent.
 #include <chrono>
 #include <string>
 
@@ -36,7 +36,7 @@ TEST_F(KerberosErrorsTest, UnknownService) {
   EXPECT_THAT(Failure(config), HasSubstr("not found in Kerberos database"));
 }
 
-// Each has a KDC that goes wrong, and so one of its own.
+// Each test has its own KDC, since it breaks it.
 class BrokenRealmTest : public KerberosErrorsTest {
  protected:
   ~BrokenRealmTest() override { Realm().SetClock(0s); }

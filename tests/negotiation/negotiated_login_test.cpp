@@ -15,7 +15,7 @@ namespace {
 
 using testing::ElementsAre;
 
-/// A way to log in, with so many legs.
+/// A way to log in, and the number of its legs.
 struct Way {
   const char* name;
   bool byContext;
@@ -117,7 +117,7 @@ TEST_F(NegotiatedTokenTest, IsGoodForTheOtherOperations) {
   EXPECT_EQ(service->AcquireTokenByToken(*token, TenMinutes())->Subject(), token->Subject());
 }
 
-TEST_F(NegotiatedTokenTest, CarriesWhatTheSpecAsksFor) {
+TEST_F(NegotiatedTokenTest, HasWhatTheSpecAsksFor) {
   TokenSpec spec = TenMinutes();
   spec.audienceRestriction = {"urn:one", "urn:two"};
   spec.tokenLifetimeSec = 300;

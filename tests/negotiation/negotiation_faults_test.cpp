@@ -65,12 +65,12 @@ TEST_F(NegotiationFaultsTest, AnEmptyContextIdStartsTheContextAnew) {
   EXPECT_EQ(lost.token, nullptr);
   ASSERT_NE(lost.outputLeg, nullptr);
   EXPECT_FALSE(lost.outputLeg->empty());
-  // The next call is a first one again, with a login of its own.
+  // The next call starts a new negotiation with a new login.
   EXPECT_NE(LogInByContext(*context, *handler), nullptr);
   EXPECT_EQ(Legs().at(1).ordinal, 1U);
 }
 
-TEST_F(NegotiationFaultsTest, AnEmptyLegInTheMiddleIsNoAnswer) {
+TEST_F(NegotiationFaultsTest, AnEmptyLegInTheMiddleIsNotAnAnswer) {
   for (const bool omit : {false, true}) {
     Sts().ClearRequests();
     DevSts::LegMisbehavior leg;
@@ -84,14 +84,14 @@ TEST_F(NegotiationFaultsTest, AnEmptyLegInTheMiddleIsNoAnswer) {
   }
 }
 
-TEST_F(NegotiationFaultsTest, AnEmptyLegBesideTheTokenEndsTheLogin) {
+TEST_F(NegotiationFaultsTest, AnEmptyLegWithTheTokenEndsTheLogin) {
   Sts().SetNegotiationScript(kOneLeg);
   DevSts::LegMisbehavior leg;
   leg.leg = "";
   MisbehaveOnce(leg);
   const auto handler = Alice();
   EXPECT_NE(Service()->AcquireTokenByGSS(TenMinutes(), *handler), nullptr);
-  // Nothing of Kerberos has spoken for the service.
+  // Kerberos has not authenticated the service.
   EXPECT_FALSE(handler->IsEstablished());
 }
 
@@ -170,7 +170,7 @@ class OddHandler final : public NegotiationHandler {
 };
 
 TEST_F(NegotiationFaultsTest, WhatTheHandlerThrowsReachesTheCallerUnchanged) {
-  // With one leg, the second call comes after the last leg of the service.
+  // With one leg, the second call is made after the last leg of the service.
   for (const auto& [script, call] :
        {std::pair{TwoLegs(), 1}, std::pair{TwoLegs(), 2}, std::pair{kOneLeg, 2}}) {
     Sts().SetNegotiationScript(script);

@@ -1,4 +1,4 @@
-// Many logins at once, and the asynchronous twin.
+// Concurrent and asynchronous logins.
 #include <cstddef>
 #include <memory>
 #include <thread>

@@ -11,7 +11,7 @@ namespace SsoClient::Testing {
 
 namespace {
 
-/// Makes the process a part of the realm before any thread reads the environment.
+/// Adds the process to the realm before any thread reads the environment.
 class RealmEnvironment : public testing::Environment {
  public:
   struct Parts {

@@ -10,8 +10,9 @@
 namespace SsoClient::Testing {
 namespace {
 
-TEST(SecretTextTest, CleansesItsTextWhenItDies) {
-  const std::string secret = "hunter2-secret";  // short enough to stand in the string object itself
+TEST(SecretTextTest, CleansesItsTextWhenItIsDestroyed) {
+  const std::string secret =
+      "hunter2-secret";  // short enough to be stored in the string object itself
   alignas(SecretText) std::array<unsigned char, sizeof(SecretText)> storage{};
   auto* text = new (storage.data()) SecretText(secret);
   EXPECT_EQ(text->text, secret);

@@ -17,7 +17,7 @@
 #include "support/forgeries.h"
 
 // Forged assertions in the answers of a service: whatever part of an answer the client reads, it
-// never takes a forged one for a token.
+// never accepts a forged assertion as a token.
 namespace SsoClient::Testing {
 namespace {
 
@@ -61,7 +61,7 @@ std::vector<std::string> Answers(const std::string& forged, const std::string& o
   return answers;
 }
 
-// "" if refused, else the name of the accepted subject.
+// The name of the accepted subject; "" if refused.
 std::string AcceptedSubject(const std::string& answer,
                             const Tarnik::Xml::Security::KeyInfoResolver* resolver) {
   const auto reader = Tarnik::CreateStringReader(answer);
@@ -92,8 +92,8 @@ INSTANTIATE_TEST_SUITE_P(Arrangements, AnswerWrappingTest,
                          testing::Combine(testing::ValuesIn(AllForgedIds()),
                                           testing::ValuesIn(AllForgedSignatures())));
 
-// The same answers hand the forged assertion out when nothing is verified, so it is the signature
-// that the tests above see refused.
+// Without verification the same answers return the forged assertion. So the tests above fail
+// because of the signature.
 TEST(AnswerWrappingControlTest, ReadsForgeriesWhenNothingIsVerified) {
   const std::string original = OriginalAssertion();
   const std::string forged = ForgedAssertion(ForgedId::kNew, ForgedSignature::kStranger, original);

@@ -115,7 +115,7 @@ TEST_F(CreateSecurityTokenServiceTest, TheKeyInfoResolverIsNotForTheService) {
   config_.keyInfoResolver = resolver.get();
   const auto service = CreateSecurityTokenService(config_);
   EXPECT_EQ(resolver->RefCount(), 1);
-  // The answered token is signed by nobody.
+  // The token in the answer is not signed.
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
 }
 

@@ -32,7 +32,7 @@ std::string Complaint(const HolderOfKeyConfig& config) {
   return ThrownMessage<InvalidArgumentException>([&] { CheckHolderOfKeyConfig(config); });
 }
 
-TEST(HolderOfKeyCheckTest, AcceptsNoneAndOneThatFits) {
+TEST(HolderOfKeyCheckTest, AcceptsNoConfigurationAndAMatchingOne) {
   EXPECT_NO_THROW(CheckHolderOfKeyConfig(boost::none));
   EXPECT_NO_THROW(CheckHolderOfKeyConfig(ConfigOf(KeyCredential())));
 }
@@ -60,7 +60,7 @@ TEST(HolderOfKeyCheckTest, RefusesKeysThatCannotSign) {
             "HolderOfKeyConfig: the RSA key must have at least 2048 bits.");
 }
 
-/// A certificate of the caller's own making, which claims to be these bytes.
+/// A certificate that the caller implements and that returns these bytes.
 class ForeignCertificate final : public Tarnik::Crypto::Certificate, public Tarnik::ObjectImpl {
  public:
   explicit ForeignCertificate(std::string der) : der_(std::move(der)) {}
@@ -82,7 +82,7 @@ class ForeignCertificate final : public Tarnik::Crypto::Certificate, public Tarn
   std::vector<unsigned char> identifier_;
 };
 
-/// A private key of the caller's own making, which claims to fit.
+/// A private key that the caller implements and that claims to match.
 class ForeignKey final : public Tarnik::Crypto::PrivateKey, public Tarnik::ObjectImpl {
  public:
   Tarnik::Ref<const Tarnik::Crypto::PublicKey> GetPublicKey() const override { return nullptr; }
@@ -123,7 +123,7 @@ DateTime Later(const DateTime& time, long seconds) {
   return Tarnik::System::DateTimeFromUtc(time.GetUtcTime() + seconds * 1'000'000, false);
 }
 
-TEST(HolderOfKeyCheckTest, HoldsThePeriodOfValidityWithTenMinutesForTheClocks) {
+TEST(HolderOfKeyCheckTest, ChecksThePeriodOfValidityWithTenMinutesOfTolerance) {
   const auto certificate = ConfigOf(KeyCredential()).certificate;
   const std::string accepted = "Nothing was thrown.";
   EXPECT_EQ(PeriodComplaint(*certificate, GetUtcDateTime()), accepted);

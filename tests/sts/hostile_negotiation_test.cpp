@@ -30,7 +30,7 @@ using testing::Not;
 
 using Leg = std::vector<unsigned char>;
 
-/// Keeps what it is given, and answers with a byte.
+/// Records what it is given and returns one byte.
 class ListeningHandler final : public NegotiationHandler {
  public:
   std::shared_ptr<const Leg> Negotiate(const Leg& serverLeg) override {
@@ -41,7 +41,7 @@ class ListeningHandler final : public NegotiationHandler {
   std::vector<Leg> received;
 };
 
-/// A loop, or a context that is called until it has a token.
+/// With the loop, or with a context that is called until it has a token.
 class HostileNegotiationTest : public testing::TestWithParam<bool> {
  protected:
   void Answer(std::vector<std::string> answers) {
@@ -84,13 +84,13 @@ std::string ContextIn(const std::string& request) {
   return std::string(message->FindAttribute("Context").value_or("no Context"));
 }
 
-// As it is written in an answer, and what it means.
+// As it is written in an answer, and its value.
 struct ContextId {
   std::string written;
   std::string meant;
 };
 
-TEST_P(HostileNegotiationTest, AContextIdComesBackAsItIsWhateverIsInIt) {
+TEST_P(HostileNegotiationTest, AnyContextIdIsSentBackUnchanged) {
   const std::string huge(std::size_t{1} << 20, 'c');
   for (const auto& [written, meant] :
        {ContextId{"&quot;>&lt;wst:BinaryExchange/>", "\"><wst:BinaryExchange/>"},
@@ -108,7 +108,7 @@ TEST_P(HostileNegotiationTest, AContextIdComesBackAsItIsWhateverIsInIt) {
   }
 }
 
-TEST_P(HostileNegotiationTest, AContextIdThatXmlCannotCarryIsNoAnswer) {
+TEST_P(HostileNegotiationTest, AContextIdThatXmlForbidsIsRefused) {
   for (const std::string written :
        {"&#0;", "&#1;", "&#xFFFE;", "&#xD800;", "<", "&unknown;", "\x01", "\xC0\x80", "\xFF"}) {
     SCOPED_TRACE(written);
@@ -123,21 +123,21 @@ std::string Exchange(const std::string& content, const std::string& attributes =
   return "<wst:BinaryExchange" + attributes + ">" + content + "</wst:BinaryExchange>";
 }
 
-// An answer's content, and the leg that the handler is given of it.
+// The content of an answer, and the leg that the handler receives.
 struct LegContent {
   std::string content;
   std::string leg;
 };
 
-TEST_P(HostileNegotiationTest, OfManyLegsTheHandlerIsGivenTheFirst) {
+TEST_P(HostileNegotiationTest, TheHandlerReceivesTheFirstOfManyLegs) {
   for (const auto& [content, leg] :
        {LegContent{Exchange("Zmlyc3Q=") + Exchange("c2Vjb25k"), "first"},
         LegContent{Exchange("Zmly<x>c2Vjb25k</x>") + Exchange("c2Vjb25k"), "fir"},
         LegContent{"<x>" + Exchange("c2Vjb25k") + "</x>" + Exchange("Zmlyc3Q="), "first"},
-        // Nothing but Base64 and SPNEGO is asked for, whatever the service calls it.
+        // Only Base64 and SPNEGO are requested, whatever the service calls them.
         LegContent{Exchange("Zmlyc3Q=", " EncodingType=\"urn:hex\" ValueType=\"urn:other\""),
                    "first"},
-        // A token beside a leg that is not the last is none yet.
+        // A token next to a leg that is not the last is ignored.
         LegContent{Exchange("Zmlyc3Q=") + Requested(kAssertionXml), "first"}}) {
     SCOPED_TRACE(content);
     handler_.received.clear();
@@ -172,7 +172,7 @@ TEST(HostileNegotiationLoopTest, EndsWhenTheServiceNeverDoes) {
   }
 }
 
-TEST_P(HostileNegotiationTest, AFaultBesideATokenIsAFault) {
+TEST_P(HostileNegotiationTest, AFaultWithATokenIsAFault) {
   const std::string fault = Fault("wst:FailedAuthentication", "no");
   const std::string token =
       Collection(Rstr("<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
@@ -187,7 +187,7 @@ TEST_P(HostileNegotiationTest, AFaultBesideATokenIsAFault) {
   }
 }
 
-TEST_P(HostileNegotiationTest, AnAnswerOfAnotherOperationInTheMiddleIsNone) {
+TEST_P(HostileNegotiationTest, AnAnswerOfAnotherOperationInTheMiddleIsRefused) {
   for (const auto& answer :
        {IssueAnswer(), RenewAnswer(),
         Envelope(Rstr("<wst:Status><wst:Code>http://docs.oasis-open.org/ws-sx/ws-trust/200512/"

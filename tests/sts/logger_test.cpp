@@ -16,7 +16,7 @@ TEST(LoggerTest, IsNamedAfterTheLibrary) {
   EXPECT_STREQ(kLogger.Name(), "SsoClient");
 }
 
-TEST(OperationLogTest, TellsStartAndEndAtLevelSeven) {
+TEST(OperationLogTest, WritesStartAndEndAtLevelSeven) {
   const LogCapture log(7);
   {
     const OperationLog operation("AcquireToken");
@@ -27,7 +27,7 @@ TEST(OperationLogTest, TellsStartAndEndAtLevelSeven) {
                                        "7 END operation SecurityTokenServiceImpl::AcquireToken"));
 }
 
-TEST(OperationLogTest, TellsTheEndOfAnOperationThatFails) {
+TEST(OperationLogTest, WritesTheEndOfAnOperationThatFails) {
   const LogCapture log(7);
   try {
     const OperationLog operation("X");

@@ -18,7 +18,7 @@ namespace {
 using Tarnik::InvalidArgumentException;
 using Tarnik::InvalidStateException;
 
-// What a request is to be; an error message instead of a header when it is refused.
+// The expected request; an error message instead of a header if it is refused.
 struct SigningCase {
   const char* name;
   BuildOperation operation;
@@ -26,7 +26,7 @@ struct SigningCase {
   ConfirmationType confirmation;
   bool isActingAs;
   std::vector<std::string> header;
-  const char* keyType;  // null: none in the body
+  const char* keyType;  // null if the body has none
   bool hasUseKey;
   const char* refusal = nullptr;
 };
@@ -40,7 +40,8 @@ constexpr char kNotDefault[] =
     "TokenSpec::confirmation must be CONFIRMATION_DEFAULT for acquire token by certificate";
 constexpr auto kDefault = CONFIRMATION_DEFAULT;
 constexpr auto kOther = CONFIRMATION_BEARER;
-constexpr auto kUnnamed = static_cast<ConfirmationType>(-1);  // anything but zero means bearer
+constexpr auto kUnnamed =
+    static_cast<ConfirmationType>(-1);  // every value except zero means bearer
 
 const std::vector<std::string> kPlainPassword{kTimestamp, kUsername};
 const std::vector<std::string> kSignedPassword{kTimestamp, kUsername, kCertificate, kSignature};

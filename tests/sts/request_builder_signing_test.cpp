@@ -103,7 +103,7 @@ TEST(RequestSigningTimesTest, EveryTimestampIsValidForTenMinutes) {
   }
 }
 
-TEST(RequestSigningTimesTest, TheLifetimeAskedForIsThatOfTheSpecOrTheRenewal) {
+TEST(RequestSigningTimesTest, TheRequestedLifetimeIsThatOfTheSpecOrTheRenewal) {
   for (const BuildOperation& operation :
        {BuildOperation(ByPassword), BuildOperation(InitialLeg), BuildOperation(ByCertificate),
         BuildOperation(ByToken), BuildOperation(Renew)}) {
@@ -117,7 +117,7 @@ TEST(RequestSigningTimesTest, TheLifetimeAskedForIsThatOfTheSpecOrTheRenewal) {
   }
 }
 
-TEST(RequestSigningOrderTest, TheLifetimeIsJudgedFirst) {
+TEST(RequestSigningOrderTest, TheLifetimeIsCheckedFirst) {
   for (const bool hasKey : {false, true}) {
     const auto builder = hasKey ? BuilderWithKey() : RequestBuilderImpl(boost::none);
     for (const BuildOperation& operation :
@@ -178,7 +178,7 @@ constexpr char kUtility[] =
     " xmlns:u=\"http://docs.oasis-open.org/wss/2004/01/"
     "oasis-200401-wss-wssecurity-utility-1.0.xsd\"";
 
-// The ids of what is signed are drawn anew for each request.
+// The ids of the signed elements are new for each request.
 TEST(RequestSigningTokenTest, IdsInsideOfTokensDoNotDivertTheSignature) {
   for (const std::string& attributes :
        {std::string("u:Id=\"Body\"") + kUtility, std::string("id=\"Timestamp\"")}) {
@@ -189,7 +189,7 @@ TEST(RequestSigningTokenTest, IdsInsideOfTokensDoNotDivertTheSignature) {
   }
 }
 
-TEST(RequestSigningTokenTest, TokensMayNotCarryTheIdsOfTheRequestItself) {
+TEST(RequestSigningTokenTest, TokensMayNotContainTheIdsOfTheRequest) {
   for (const std::string& id :
        {std::string("holderOfKeyProofSignature"), std::string("holderOfKeyCertificate")}) {
     for (const std::string& attributes :
@@ -231,7 +231,7 @@ TEST(RequestSigningCertificateTest, AnExpiredCertificateSignsNothing) {
   EXPECT_NE(request.body, "");
 }
 
-TEST(RequestSigningLayoutTest, OperationsStandInTheirOrder) {
+TEST(RequestSigningLayoutTest, OperationsKeepTheirSlotOrder) {
   const auto builder = BuilderWithKey();
   const RequestBuilder& object = builder;
   SoapRequest request;

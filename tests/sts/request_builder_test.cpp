@@ -108,7 +108,7 @@ TEST(RequestBuilderImplTest, EmptyCredentialsAreSentEmpty) {
   EXPECT_THAT(BuiltBody(SpecOf(60), "", ""), HasSubstr("<wsse:Username></wsse:Username>"));
 }
 
-TEST(RequestBuilderImplTest, CredentialsThatXmlCannotCarryAreRefusedByElement) {
+TEST(RequestBuilderImplTest, CredentialsThatXmlForbidsAreRefusedByElement) {
   const auto failure = [](const std::string& user, const std::string& password) {
     SoapRequest request;
     try {
@@ -129,7 +129,7 @@ TEST(RequestBuilderImplTest, CredentialsThatXmlCannotCarryAreRefusedByElement) {
   }
 }
 
-TEST(RequestBuilderImplTest, TheOperationStandsFirst) {
+TEST(RequestBuilderImplTest, TheOperationIsTheFirstSlot) {
   const RequestBuilderImpl builder(boost::none);
   const RequestBuilder& object = builder;
   SoapRequest request;
@@ -139,12 +139,12 @@ TEST(RequestBuilderImplTest, TheOperationStandsFirst) {
   EXPECT_EQ(request.action, kIssueAction);
 }
 
-// What a caller puts into a request stands there as text, however much it looks like markup: an
-// independent parser reads it back.
+// The values that a caller puts into a request are sent as text, even if they look like markup: an
+// independent parser reads them back.
 constexpr char kMarkup[] =
     "</a>&amp;&#0;<!--c--><?p?>]]><![CDATA[\"'\r\n\t\xC3\xA4\xF0\x9F\x94\x91 ";
 
-// As canonical XML writes it (section 2.3) in a text and in an attribute.
+// As Canonical XML (section 2.3) writes it in a text and in an attribute.
 constexpr char kInText[] =
     "&lt;/a&gt;&amp;amp;&amp;#0;&lt;!--c--&gt;&lt;?p?&gt;]]&gt;&lt;![CDATA[\"'&#xD;\n\t"
     "\xC3\xA4\xF0\x9F\x94\x91 ";

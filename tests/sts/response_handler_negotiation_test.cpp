@@ -52,7 +52,7 @@ TEST(ParseNegotiationResponseTest, AResponseOutsideOfACollectionIsIntermediate) 
   EXPECT_EQ(response.token, "");
 }
 
-TEST(ParseNegotiationResponseTest, OfTwoFinalAnswersTheFirstCounts) {
+TEST(ParseNegotiationResponseTest, TheFirstOfTwoFinalAnswersCounts) {
   const auto response = ParseNegotiation(Envelope(
       Collection(Rstr(kSamlType + Requested(kAssertionXml), " Context=\"first\"") +
                  Rstr(kExchange + std::string(kSamlType) + Requested("<Assertion n=\"2\"/>"),
@@ -63,7 +63,7 @@ TEST(ParseNegotiationResponseTest, OfTwoFinalAnswersTheFirstCounts) {
 }
 
 // The context, the leg, the assertion, the token type.
-TEST(ParseNegotiationResponseTest, WhatIsMissingIsToldInTheOrderOfReading) {
+TEST(ParseNegotiationResponseTest, MissingPartsAreReportedInReadingOrder) {
   const std::string badLeg = "<wst:BinaryExchange>!</wst:BinaryExchange>";
   EXPECT_EQ(Failure([&] { ParseNegotiation(Envelope(Rstr(badLeg))); }), kFormat);
   EXPECT_EQ(Failure([&] { ParseNegotiation(Envelope(Collection(Rstr(badLeg)))); }), kFormat);

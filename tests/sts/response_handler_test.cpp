@@ -61,9 +61,9 @@ std::string StatusAnswer(const std::string& code) {
 constexpr char kValid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid";
 constexpr char kInvalid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid";
 
-// What every operation does before it looks into the body.
+// What every operation does before it reads the body.
 
-TEST(ResponseHandlerImplTest, AnAnswerThatIsNoXmlSaysWhy) {
+TEST(ResponseHandlerImplTest, AnAnswerThatIsNotXmlIsRefusedWithTheReason) {
   for (const auto& [name, parse] : AllParsers()) {
     for (const std::string answer : {"", "no XML", "<a>", "<a></b>", "<a/><b/>", "<p:a/>",
                                      "<!DOCTYPE a><a/>", "<a>\xff</a>", "<a b='1' b='2'/>"}) {
@@ -106,7 +106,7 @@ TEST(ResponseHandlerImplTest, AFaultIsReportedBeforeTheBodyIsExamined) {
   }
 }
 
-TEST(ResponseHandlerImplTest, OfTwoBodiesTheFirstCounts) {
+TEST(ResponseHandlerImplTest, TheFirstOfTwoBodiesCounts) {
   const std::string second =
       "<Body>" + Collection(Rstr(Requested("<Assertion n=\"2\"/>"))) + "</Body>";
   const std::string start = R"(<E xmlns:wst="urn:w"><Body>)";
@@ -120,7 +120,7 @@ TEST(ResponseHandlerImplTest, OfTwoBodiesTheFirstCounts) {
             kFormat);
 }
 
-TEST(ResponseHandlerImplTest, AnAnswerCutOffAnywhereIsNoAnswer) {
+TEST(ResponseHandlerImplTest, AnAnswerCutOffAnywhereIsRefused) {
   const struct {
     std::string answer;
     Parser parse;
@@ -174,7 +174,7 @@ TEST(ParseIssueResponseTest, GivesTheCanonicalAssertionWithItsInheritedNamespace
   EXPECT_EQ(ParseIssue(IssueAnswer()), kCanonicalAssertion);
 }
 
-TEST(ParseIssueResponseTest, IgnoresWhatStandsBeside) {
+TEST(ParseIssueResponseTest, IgnoresOtherContent) {
   EXPECT_EQ(ParseIssue(Envelope(
                 "text<other/>" +
                 Collection("<!-- c -->" +
@@ -184,7 +184,7 @@ TEST(ParseIssueResponseTest, IgnoresWhatStandsBeside) {
             kCanonicalAssertion);
 }
 
-TEST(ParseIssueResponseTest, OfTwoAssertionsTheFirstCounts) {
+TEST(ParseIssueResponseTest, TheFirstOfTwoAssertionsCounts) {
   const std::string second = "<Assertion n=\"2\"/>";
   EXPECT_EQ(ParseIssue(Envelope(Collection(Rstr(Requested(kAssertionXml + second))))),
             kCanonicalAssertion);
@@ -213,7 +213,7 @@ TEST(ParseIssueResponseTest, ComparesNoNamespaces) {
             R"(<a:Assertion xmlns:a="urn:a"></a:Assertion>)");
 }
 
-TEST(ParseIssueResponseTest, EveryElementOnTheWayIsNeeded) {
+TEST(ParseIssueResponseTest, EveryElementOfThePathIsRequired) {
   for (const auto& body :
        {std::string(), Rstr(Requested(kAssertionXml)), Collection(""), Collection(Rstr("")),
         Collection(Rstr(Requested(""))), Collection(Rstr(kAssertionXml)),
@@ -231,7 +231,7 @@ TEST(ParseRenewResponseTest, GivesTheCanonicalAssertion) {
   EXPECT_EQ(ParseRenew(RenewAnswer()), kCanonicalAssertion);
 }
 
-TEST(ParseRenewResponseTest, OfTwoResponsesOrAssertionsTheFirstCounts) {
+TEST(ParseRenewResponseTest, TheFirstOfTwoResponsesOrAssertionsCounts) {
   const std::string second = "<Assertion n=\"2\"/>";
   EXPECT_EQ(ParseRenew(Envelope(Rstr("<wst:TokenType>any</wst:TokenType><wst:Lifetime/>" +
                                      Requested(kAssertionXml + second) + Requested(second)) +
@@ -241,7 +241,7 @@ TEST(ParseRenewResponseTest, OfTwoResponsesOrAssertionsTheFirstCounts) {
             kFormat);
 }
 
-TEST(ParseRenewResponseTest, EveryElementOnTheWayIsNeededAndNoCollection) {
+TEST(ParseRenewResponseTest, EveryElementOfThePathIsRequiredAndNoCollection) {
   for (const auto& body : {std::string(), Collection(Rstr(Requested(kAssertionXml))), Rstr(""),
                            Rstr(Requested("")), Rstr(kAssertionXml), Requested(kAssertionXml)}) {
     EXPECT_EQ(Failure([&] { ParseRenew(Envelope(body)); }), kFormat) << body;
@@ -250,7 +250,7 @@ TEST(ParseRenewResponseTest, EveryElementOnTheWayIsNeededAndNoCollection) {
 
 // Validate.
 
-TEST(ParseValidateResponseTest, TellsTheVerdict) {
+TEST(ParseValidateResponseTest, ReturnsTheVerdict) {
   EXPECT_TRUE(ParseValidate(StatusAnswer(kValid)));
   EXPECT_FALSE(ParseValidate(StatusAnswer(kInvalid)));
   EXPECT_TRUE(ParseValidate(StatusAnswer("<![CDATA[" + std::string(kValid) + "]]>")));
@@ -276,7 +276,7 @@ TEST(ParseValidateResponseTest, AnyOtherCodeIsUnexpected) {
   }
 }
 
-TEST(ParseValidateResponseTest, EveryElementOnTheWayIsNeeded) {
+TEST(ParseValidateResponseTest, EveryElementOfThePathIsRequired) {
   const std::string code = "<wst:Code>" + std::string(kValid) + "</wst:Code>";
   const std::string status = "<wst:Status>" + code + "</wst:Status>";
   for (const auto& body : {std::string(), Rstr(""), Rstr("<wst:Status/>"), Rstr(code), status,
@@ -285,7 +285,7 @@ TEST(ParseValidateResponseTest, EveryElementOnTheWayIsNeeded) {
   }
 }
 
-TEST(ResponseHandlerImplTest, OperationsStandInTheirOrder) {
+TEST(ResponseHandlerImplTest, OperationsKeepTheirSlotOrder) {
   const ResponseHandlerImpl handler;
   const ResponseHandler& object = handler;
   using ParseText = void(const void*, Tarnik::Reader*, std::string&);

@@ -51,7 +51,7 @@ TEST(ResponseElementsTest, FindDescendantTakesTheFirstOfEachName) {
   EXPECT_EQ(FindDescendant(root, {"missing", "b"}), nullptr);
 }
 
-TEST(ResponseElementsTest, CanonicalTextCarriesTheNamespacesThatAreInheritedAndNoComments) {
+TEST(ResponseElementsTest, CanonicalTextHasInheritedNamespacesAndNoComments) {
   const auto document = ParseXml(
       R"(<r xmlns="urn:d" xmlns:q="urn:q" xml:lang="en"><a z="1" b='2'><!--c-->t</a></r>)");
   EXPECT_EQ(CanonicalizeElement(document->RootElement()->FirstChildElement("a")),
@@ -131,7 +131,7 @@ TEST(SoapFaultTest, CodesAreComparedByTheirNamespace) {
       Expect<SsoException>("Unexpected SOAP fault: wst:FailedAuthentication; request failed."));
 }
 
-TEST(SoapFaultTest, AnyOtherCodeIsToldAsItWasReceived) {
+TEST(SoapFaultTest, AnyOtherCodeIsReportedAsReceived) {
   for (const std::string code :
        {"wsse:FailedAuthentication", "S:Server", "wst:InvalidRequest", "wst:failedauthentication",
         "wst:FailedAuthentication2", "FailedAuthentication", "InvalidSecurityToken",
@@ -141,7 +141,7 @@ TEST(SoapFaultTest, AnyOtherCodeIsToldAsItWasReceived) {
   }
 }
 
-TEST(SoapFaultTest, AnExpiredPasswordIsToldByThePrefixOfTheText) {
+TEST(SoapFaultTest, AnExpiredPasswordIsRecognisedByThePrefixOfTheText) {
   EXPECT_EQ(ThrownFor(Envelope(Fault("wst:FailedAuthentication", kExpired))),
             Expect<PasswordExpiredException>(
                 "Authentication failed: Password of the user logging on is expired"));
@@ -151,7 +151,7 @@ TEST(SoapFaultTest, AnExpiredPasswordIsToldByThePrefixOfTheText) {
           "Authentication failed: Password of the user logging on is expired. :: alice"));
 }
 
-TEST(SoapFaultTest, TheExpiryTextElsewhereIsNoExpiredPassword) {
+TEST(SoapFaultTest, TheExpiryTextElsewhereIsNotAnExpiredPassword) {
   const std::string later = "Sorry: " + std::string(kExpired);
   EXPECT_EQ(ThrownFor(Envelope(Fault("wst:FailedAuthentication", later))),
             Expect<InvalidCredentialsException>("Authentication failed: " + later));

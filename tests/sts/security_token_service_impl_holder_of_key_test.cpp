@@ -161,7 +161,7 @@ TEST(HolderOfKeyOperationsTest, ArgumentErrorsComeBeforeAnythingIsSent) {
   EXPECT_EQ(sts.transport->sessions, 0);
 }
 
-TEST(HolderOfKeyOperationsAsyncTest, TwinsGiveTokens) {
+TEST(HolderOfKeyOperationsAsyncTest, TokensReachTheCallback) {
   const Sts issuing(IssueAnswer());
   const Sts renewing(RenewAnswer());
   const auto presented = Presented();
@@ -179,7 +179,7 @@ TEST(HolderOfKeyOperationsAsyncTest, TwinsGiveTokens) {
   }
 }
 
-TEST(HolderOfKeyOperationsAsyncTest, TwinsAskForTheSame) {
+TEST(HolderOfKeyOperationsAsyncTest, RequestsEqualTheSynchronousOnes) {
   const Sts sts(IssueAnswer());
   const auto service = sts.Service();
   const auto presented = Presented();
@@ -236,7 +236,7 @@ TEST(HolderOfKeyOperationsAsyncTest, ThreadsMaySignWithOneServiceThatIsReleasedM
   EXPECT_EQ(different.size(), 2U * kThreads * kRounds);
 }
 
-TEST(HolderOfKeyOperationsAsyncTest, TwinsReportErrorsWithTheirClass) {
+TEST(HolderOfKeyOperationsAsyncTest, ErrorsReachTheCallbackWithTheirClass) {
   const Sts sts(IssueAnswer());
   auto bearer = Presented();
   bearer.confirmationType = BEARER;
@@ -285,7 +285,7 @@ TEST(HolderOfKeyOperationsAsyncTest, EmptyCallbacksAreRefusedAtTheCall) {
   EXPECT_THROW(service->RenewTokenAsync(presented, 60, nullptr), Tarnik::InvalidArgumentException);
 }
 
-TEST(HolderOfKeyOperationsTest, OperationsStandInTheirOrder) {
+TEST(HolderOfKeyOperationsTest, OperationsKeepTheirSlotOrder) {
   using Token = std::shared_ptr<const SamlToken>;
   using Callback = SecurityTokenService::TokenCallback;
   const Sts sts(IssueAnswer());

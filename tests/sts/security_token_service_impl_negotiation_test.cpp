@@ -40,7 +40,7 @@ using LegHandle = std::shared_ptr<const Leg>;
 constexpr char kContractError[] =
     "4 GSS contract error: non-empty user leg after negotiation is complete";
 
-// Answers each call with the next leg, and records what it was given.
+// Returns the next leg on each call, and records what it was given.
 class ScriptedHandler final : public NegotiationHandler {
  public:
   explicit ScriptedHandler(std::vector<LegHandle> legs) : legs_(std::move(legs)) {}
@@ -106,7 +106,7 @@ TEST(NegotiatedLoginTest, LaterLegsContinueTheNegotiationInOneSession) {
   EXPECT_THAT(sts.transport->bodies[1],
               HasSubstr("<wst:RequestSecurityTokenResponse Context=\"first\">"));
   EXPECT_THAT(sts.transport->bodies[1], HasSubstr(">Ag==</wst:BinaryExchange>"));
-  // The context is the one of the last answer.
+  // The context is that of the last answer.
   EXPECT_THAT(sts.transport->bodies[2],
               HasSubstr("<wst:RequestSecurityTokenResponse Context=\"second\">"));
   EXPECT_THAT(sts.transport->bodies[2], Not(HasSubstr("Lifetime")));
@@ -173,7 +173,7 @@ TEST(NegotiatedLoginTest, ANullLegFailsBeforeAnythingIsSent) {
   EXPECT_THAT(sts.transport->bodies, IsEmpty());
 }
 
-TEST(NegotiatedLoginTest, ANullLegLaterEndsTheLogin) {
+TEST(NegotiatedLoginTest, ALaterNullLegEndsTheLogin) {
   const Sts sts({LegAnswer("c")});
   ScriptedHandler handler({LegOf({1}), nullptr});
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
@@ -193,7 +193,7 @@ TEST(NegotiatedLoginTest, AnAnswerWithoutAContextIsRefusedEvenWithAToken) {
   }
 }
 
-TEST(NegotiatedLoginTest, TheLifetimeIsJudgedBeforeAnythingIsSent) {
+TEST(NegotiatedLoginTest, TheLifetimeIsCheckedBeforeAnythingIsSent) {
   const Sts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({1})});
   const LogCapture log(7);
@@ -233,7 +233,7 @@ TEST(NegotiatedLoginTest, WhatTheHandlerThrowsPassesUnchanged) {
   EXPECT_EQ(log.Lines().back(), "7 END operation SecurityTokenServiceImpl::AcquireTokenByGSS");
 }
 
-TEST(NegotiatedLoginAsyncTest, TheTwinReportsTokenAndErrors) {
+TEST(NegotiatedLoginAsyncTest, ReportsTokenAndErrors) {
   ScriptedHandler handler({LegOf({1})});
   AsyncCall call;
   auto spec = OneHour();
@@ -315,7 +315,7 @@ TEST(NegotiatedLoginAsyncTest, ACallReturnsAtOnceAndWorksWithACopyOfTheService) 
   EXPECT_EQ(sts.transport->bodies.size(), 1U);
 }
 
-TEST(NegotiatedLoginTest, OperationsStandInTheirOrder) {
+TEST(NegotiatedLoginTest, OperationsKeepTheirSlotOrder) {
   using Token = std::shared_ptr<const SamlToken>;
   const auto service = Sts({LastLegAnswer()}).Service();
   const SecurityTokenService* object = service.get();

@@ -108,7 +108,7 @@ TEST_F(SecurityTokenServiceImplTest, TracesTheOperation) {
                           "7 END operation SecurityTokenServiceImpl::AcquireToken"));
 }
 
-TEST_F(SecurityTokenServiceImplTest, TellsOnlyTheSuccessAtLevelsFiveAndSix) {
+TEST_F(SecurityTokenServiceImplTest, LogsOnlyTheSuccessAtLevelsFiveAndSix) {
   for (const int level : {5, 6}) {
     const LogCapture log(level);
     const auto token = MakeService()->AcquireToken("alice", "pw", OneHour());
@@ -227,7 +227,7 @@ TEST_F(SecurityTokenServiceImplAsyncTest, AnEmptyCallbackIsRefusedAtTheCall) {
   EXPECT_EQ(transport_->sessions, 0);
 }
 
-TEST_F(SecurityTokenServiceImplTest, OperationsStandInTheirOrder) {
+TEST_F(SecurityTokenServiceImplTest, OperationsKeepTheirSlotOrder) {
   const auto service = MakeService();
   const SecurityTokenService* object = service.get();
   using Acquire = std::shared_ptr<const SamlToken>(const void*, const std::string&,

@@ -103,7 +103,7 @@ std::string Replaced(std::string text, std::string_view from, std::string_view t
   return text.replace(place, from.size(), to);
 }
 
-std::string InsertedBehind(std::string text, std::string_view anchor, std::string_view addition) {
+std::string InsertedAfter(std::string text, std::string_view anchor, std::string_view addition) {
   return Replaced(std::move(text), anchor, std::string(anchor).append(addition));
 }
 

@@ -12,7 +12,7 @@
 
 namespace SsoClient::Testing {
 
-/// What a callback was given.
+/// What a callback received.
 struct Report {
   std::shared_ptr<const SamlToken> token;
   std::string errorType;

@@ -15,7 +15,7 @@
 
 namespace SsoClient::Testing {
 
-/// A token that is nothing but its text, its subject's name and what a test sets.
+/// A token with a text, a subject and the values that a test sets.
 class FakeSamlToken final : public SamlToken {
  public:
   explicit FakeSamlToken(std::string xml, std::string subjectName = "alice")

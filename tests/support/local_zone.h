@@ -8,7 +8,7 @@
 
 namespace SsoClient::Testing {
 
-/// While it lives, the process's local zone is 5:30 ahead of UTC.
+/// During its lifetime, the local time zone of the process is 5:30 ahead of UTC.
 class LocalZone {
  public:
   LocalZone() {

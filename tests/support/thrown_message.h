@@ -11,7 +11,7 @@
 namespace SsoClient::Testing {
 
 /// The message of the exception that `action` throws if its class is exactly `Expected`, else a
-/// text that says what happened instead.
+/// text that describes what happened instead.
 template <class Expected, class Action>
 std::string ThrownMessage(Action&& action) {
   try {

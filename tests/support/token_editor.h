@@ -7,11 +7,11 @@
 
 namespace SsoClient::Testing {
 
-/// Makes signed assertions of every kind and edits them, as a source of numbers decides: by chance,
-/// or by a fuzzer's input.
+/// Makes signed assertions of every kind and edits them. A source of numbers makes the choices:
+/// random numbers, or the input of a fuzzer.
 class TokenEditor {
  public:
-  /// `below` gives a number below its argument, which is at least one.
+  /// `below` returns a number less than its argument, which is at least one.
   explicit TokenEditor(std::function<std::size_t(std::size_t)> below);
 
   /// An assertion signed by the trusted credential.

@@ -11,7 +11,7 @@
 namespace SsoClient::Testing {
 namespace {
 
-// With its length in front, so that no two lists of values give one text.
+// Prefixed with its length, so that different lists of values give different texts.
 void Add(std::string& text, const std::string& value) {
   text += std::to_string(value.size()) + ":" + value + ";";
 }

@@ -7,8 +7,8 @@
 
 namespace SsoClient::Testing {
 
-/// Everything that a token tells but its text, in one text: two tokens that tell the same give the
-/// same.
+/// All values of a token except its text, in one string: tokens with the same values give the same
+/// string.
 std::string AllValues(const SamlToken& token);
 
 }  // namespace SsoClient::Testing

@@ -5,8 +5,8 @@
 
 namespace SsoClient::Testing {
 
-/// The function in slot `index` of the virtual table that `object` begins with (Itanium C++ ABI,
-/// section 2.5), as a free function whose first parameter is the object.
+/// The function in slot `index` of the object's primary virtual table (Itanium C++ ABI, section
+/// 2.5), as a free function whose first parameter is the object.
 template <class Function>
 Function* VtableSlot(const void* object, std::size_t index) {
   void* const* const table = *static_cast<void* const* const*>(object);

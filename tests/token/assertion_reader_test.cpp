@@ -131,7 +131,7 @@ TEST(ReadAssertionTest, RefusesMissingRequiredParts) {
       "Expected element ds:Signature not found");
 }
 
-TEST(ReadAssertionTest, RefusesElementsBehindTheLastStatement) {
+TEST(ReadAssertionTest, RefusesElementsAfterTheLastStatement) {
   for (const char* tail : {"<saml2:AttributeStatement/>", "<saml2:AuthzDecisionStatement/>", "<x/>",
                            "<saml2:Issuer>i</saml2:Issuer>"}) {
     AssertionText text(kNow);
@@ -227,7 +227,7 @@ struct Fault {
   const char* message;
 };
 
-// Every part is broken: each message shows once the parts before are repaired.
+// Every part is broken. Each message appears once the parts before it are repaired.
 TEST(ReadAssertionTest, ReadsItsPartsInTheirOrder) {
   const Fault faults[] = {
       {&AssertionText::attributes, R"(ID="_a1" Version="2.0" IssueInstant="soon")",

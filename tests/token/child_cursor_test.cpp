@@ -24,7 +24,7 @@ TEST(SkipWsAndCommentsFilterTest, HidesComments) {
   EXPECT_FALSE(IsFirstChildVisible("<!---->"));
 }
 
-TEST(SkipWsAndCommentsFilterTest, HidesTextOfWhiteSpaceAlone) {
+TEST(SkipWsAndCommentsFilterTest, HidesTextOfWhiteSpaceOnly) {
   EXPECT_FALSE(IsFirstChildVisible(" "));
   EXPECT_FALSE(IsFirstChildVisible("\t"));
   EXPECT_FALSE(IsFirstChildVisible("\n"));
@@ -42,7 +42,7 @@ TEST(SkipWsAndCommentsFilterTest, HidesEmptyText) {
 TEST(SkipWsAndCommentsFilterTest, ShowsOtherText) {
   EXPECT_TRUE(IsFirstChildVisible("x"));
   EXPECT_TRUE(IsFirstChildVisible("\n x"));
-  EXPECT_TRUE(IsFirstChildVisible("\xC2\xA0"));  // no-break space is not XML's white space
+  EXPECT_TRUE(IsFirstChildVisible("\xC2\xA0"));  // a no-break space is not white space in XML
 }
 
 TEST(SkipWsAndCommentsFilterTest, ShowsElementsAndProcessingInstructions) {
@@ -80,7 +80,7 @@ TEST(ChildCursorTest, GoesIntoAnElementWithTheSameFilter) {
   EXPECT_TRUE(inner.IsAtElement("b"));
 }
 
-// Shows elements only, and counts what it is asked.
+// Shows only elements, and counts its calls.
 class ElementsOnly final : public NodeFilter {
  public:
   bool IsVisible(const Tarnik::Xml::Node& node) const override {

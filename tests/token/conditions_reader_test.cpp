@@ -51,7 +51,7 @@ std::string Refusal(const std::string& restrictions) {
   return ThrownMessage<ParseException>([&] { Read(restrictions); });
 }
 
-TEST(ReadConditionsTest, ReadsThePeriodAlone) {
+TEST(ReadConditionsTest, ReadsOnlyThePeriod) {
   const ParsedConditions conditions = Read(" <!--none--> ");
   EXPECT_EQ(conditions.notBefore.ToString(), "2024-03-05T07:00:00.000Z");
   EXPECT_EQ(conditions.notOnOrAfter.ToString(), "2024-03-05T08:00:00.000Z");
@@ -115,7 +115,7 @@ TEST(ReadConditionsTest, RefusesATypeOfAnUndefinedPrefix) {
             "Element saml2:Conditionat 3,2 uses undefined prefix: `no'");
 }
 
-TEST(ReadConditionsTest, TellsConditionsByTheTypesExpandedName) {
+TEST(ReadConditionsTest, IdentifiesConditionsByTheTypesExpandedName) {
   const ParsedConditions conditions =
       Read(R"(<saml2:Condition i:type="RenewRestrictionType" Count="5" xmlns="http://sts-vendor.)"
            R"(example/names/2009/12/std-ext/SAML2.0" )"

@@ -102,7 +102,7 @@ TEST(CreateSamlTokenTest, VerifiesEveryReferenceThoughOneCoversTheToken) {
             kTampered);
 }
 
-TEST(CreateSamlTokenTest, ChecksTheSignaturesFormAloneWithoutAResolver) {
+TEST(CreateSamlTokenTest, ChecksOnlyTheSignaturesFormWithoutAResolver) {
   const std::string xml = TamperedXml();
   EXPECT_EQ(CreateSamlToken(xml)->Subject().name, "admin");
   EXPECT_EQ(CreateSamlToken(xml, 600)->Subject().name, "admin");
@@ -131,7 +131,7 @@ TEST(CreateSamlTokenTest, RefusesATamperedTokenThroughEveryResolver) {
             kTampered);
 }
 
-TEST(CreateSamlTokenTest, RefusesAnAlteredSignatureValueThroughAResolverAlone) {
+TEST(CreateSamlTokenTest, RefusesAnAlteredSignatureValueOnlyWithAResolver) {
   std::string xml = SignedXml();
   const std::size_t value = xml.find("SignatureValue>") + 20;
   xml[value] = xml[value] == 'A' ? 'B' : 'A';
@@ -149,7 +149,7 @@ TEST(CreateSamlTokenTest, RefusesAStrangersSignature) {
   EXPECT_EQ(message.rfind("Signature verification error. ", 0), 0U) << message;
 }
 
-TEST(CreateSamlTokenTest, ReadsTheWholeTokenBeforeItJudgesValidity) {
+TEST(CreateSamlTokenTest, ReadsTheWholeTokenBeforeItChecksValidity) {
   AssertionText text;
   text.attributes = Replaced(text.attributes, "2.0", "1.1");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(text.ToXml()); }),
@@ -163,7 +163,7 @@ TEST(CreateSamlTokenTest, ReadsTheWholeTokenBeforeItJudgesValidity) {
             "Unexpected elements under Assertion");
 }
 
-TEST(CreateSamlTokenTest, JudgesValidityBeforeTheSignature) {
+TEST(CreateSamlTokenTest, ChecksValidityBeforeTheSignature) {
   const auto now = Tarnik::System::GetUtcDateTime();
   const auto longAgo = Tarnik::System::DateTimeFromUtc(now.GetUtcTime() - 7200L * 1'000'000, false);
   const std::string xml = Replaced(SignedXml(AssertionText(longAgo)), "alice@", "admin@");
@@ -177,7 +177,7 @@ AssertionText TextThatEnds(long secondsAgo) {
       Tarnik::System::DateTimeFromUtc(now.GetUtcTime() - (3600 + secondsAgo) * 1'000'000, false));
 }
 
-TEST(CreateSamlTokenTest, ToleratesTenMinutesUnlessTold) {
+TEST(CreateSamlTokenTest, ToleratesTenMinutesByDefault) {
   const std::string nineMinutes = TextThatEnds(540).ToXml();
   const std::string elevenMinutes = TextThatEnds(660).ToXml();
   EXPECT_NO_THROW(CreateSamlToken(nineMinutes));
@@ -323,7 +323,7 @@ TEST(CreateSamlTokenTest, RefusesDocumentTypes) {
   }
 }
 
-TEST(CreateSamlTokenTest, ReadsUtf8Alone) {
+TEST(CreateSamlTokenTest, ReadsOnlyUtf8) {
   const std::string xml = SignedXml();
   const auto resolver = TrustedResolver();
   EXPECT_EQ(CreateSamlToken("\xEF\xBB\xBF" + xml, resolver.get())->Subject().name, "alice");

@@ -68,7 +68,7 @@ TEST(ReadPrincipalTest, RefusesOtherAndMissingFormat) {
             "empty).");
 }
 
-// A reader that stops at a comment would see another user than the one that was signed.
+// A reader that stops at a comment would read another user than the signed one.
 TEST(ReadPrincipalTest, RefusesSplitValues) {
   for (const char* value : {"admin@x<!---->.evil", "admin@x<?p?>.evil", "admin@x<b/>.evil"}) {
     Fragment fragment(
@@ -115,7 +115,7 @@ TEST(PrincipalFromNameIdTest, RejectsOtherFormat) {
             "Invalid or unsupported NameId format 'http://schemas.xmlsoap.org/claims/upn");
 }
 
-TEST(PrincipalFromNameIdTest, JudgesTheFormatBeforeTheValue) {
+TEST(PrincipalFromNameIdTest, ChecksTheFormatBeforeTheValue) {
   EXPECT_EQ(ThrownMessage<ParseException>([] { PrincipalFromNameId("urn:other", "alice"); }),
             "Invalid or unsupported NameId format 'urn:other");
 }

@@ -32,8 +32,8 @@ TEST(PrincipalIdTest, EqualsItself) {
   EXPECT_TRUE(principal == same);
 }
 
-// The object stands on a page that no one may read while it is compared.
-TEST(PrincipalIdTest, EqualsItselfWithoutALookAtItsStrings) {
+// The object is on a page that is not readable during the comparison.
+TEST(PrincipalIdTest, EqualsItselfWithoutReadingItsStrings) {
   const auto pageSize = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
   void* page = mmap(nullptr, pageSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
   ASSERT_NE(page, MAP_FAILED);
@@ -46,8 +46,8 @@ TEST(PrincipalIdTest, EqualsItselfWithoutALookAtItsStrings) {
   munmap(page, pageSize);
 }
 
-// The domain stands on a page that no one may read while the object is compared.
-TEST(PrincipalIdTest, LooksAtTheDomainsOnlyWhenTheNamesMatch) {
+// The domain is on a page that is not readable during the comparison.
+TEST(PrincipalIdTest, ComparesTheDomainsOnlyWhenTheNamesMatch) {
   const auto pageSize = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
   void* pages =
       mmap(nullptr, 2 * pageSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);

@@ -69,7 +69,7 @@ TEST(SamlTokenFactoryDefaultTest, KeepsItsResolverAlive) {
   EXPECT_EQ(factory->CreateToken(SignedXml())->Subject().name, "alice");
 }
 
-// Notes the tolerances that it is asked for.
+// Records the tolerances that it is called with.
 class RecordingFactory final : public SamlTokenFactoryDefault {
  public:
   RecordingFactory() : SamlTokenFactoryDefault(nullptr) {}

@@ -42,7 +42,7 @@ AssertionText FullText() {
   return AssertionText(kNow).Delegate().ConfirmByKey(TrustedCredential().certificatePem);
 }
 
-TEST(SamlTokenImplTest, TellsEveryValue) {
+TEST(SamlTokenImplTest, ReturnsEveryValue) {
   const AssertionText text = FullText();
   const auto token = MakeToken(text);
   EXPECT_EQ(token->Id(), "_a1");
@@ -174,7 +174,7 @@ TEST(SamlTokenImplTest, AddsItsToleranceToTheExpirationTime) {
             "2024-03-05T08:00:00.000Z");
 }
 
-TEST(SamlTokenImplTest, TellsItsTimesInUtcInEveryZone) {
+TEST(SamlTokenImplTest, ReturnsItsTimesInUtcInEveryZone) {
   const char* before = std::getenv("TZ");
   const std::string saved = before == nullptr ? "" : before;
   setenv("TZ", "XYZ-5:30", 1);

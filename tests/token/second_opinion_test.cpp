@@ -15,14 +15,14 @@
 #include "support/token_editor.h"
 #include "support/token_values.h"
 
-// Whatever a resolver lets through tells what was signed, and an independent reader of XML
-// signatures lets it through, too: over signed assertions of every kind, edited at random.
+// Every token that a resolver accepts has the signed values, and an independent verifier of XML
+// signatures accepts it too. Tested with signed assertions of every kind, edited at random.
 namespace SsoClient::Testing {
 namespace {
 
 constexpr std::chrono::seconds kTime{4};
 
-/// What the token of this text tells, or nothing when it is refused.
+/// The values of the token with this text, or nothing if it is refused.
 std::optional<std::string> AcceptedValues(const std::string& xml) {
   static const auto resolver = TrustedResolver();
   try {
@@ -32,7 +32,7 @@ std::optional<std::string> AcceptedValues(const std::string& xml) {
   }
 }
 
-TEST(SecondOpinionTest, IsGoodOfWhateverIsAccepted) {
+TEST(SecondOpinionTest, AcceptsWhateverTheLibraryAccepts) {
   const unsigned seed = std::random_device()();
   SCOPED_TRACE("seed " + std::to_string(seed));
   std::mt19937 random(seed);
@@ -64,13 +64,13 @@ TEST(SecondOpinionTest, IsGoodOfWhateverIsAccepted) {
     ASSERT_EQ(*edited, *values) << xml;
     ASSERT_EQ(SecondOpinionOf(xml), "") << xml;
   }
-  // The edits are neither all harmless nor all fatal.
+  // Some edits are harmless and some are fatal.
   EXPECT_GT(accepted, 0U);
   EXPECT_GT(refused, 0U);
 }
 
-// The twin: the second opinion does not say yes to everything.
-TEST(SecondOpinionTest, IsBadOfATamperedAssertion) {
+// Control: the independent verifier does not accept everything.
+TEST(SecondOpinionTest, RejectsATamperedAssertion) {
   const std::string xml = Replaced(OriginalAssertion(), "alice@", "admin@");
   EXPECT_EQ(AcceptedValues(xml), std::nullopt);
   EXPECT_NE(SecondOpinionOf(xml), "");
@@ -82,15 +82,15 @@ std::string WithMalformedNamespace() {
   return Replaced(OriginalAssertion(), "<saml2:Subject>", kUnusedPrefix);
 }
 
-TEST(SecondOpinionTest, IsAskedAgainWithoutAMalformedNamespaceThatNothingUses) {
+TEST(SecondOpinionTest, IgnoresAnUnusedMalformedNamespace) {
   const std::string xml = WithMalformedNamespace();
   EXPECT_TRUE(AcceptedValues(xml));
   EXPECT_FALSE(DevSts::VerifyXml(xml, TrustedCredential().certificatePem));
   EXPECT_EQ(SecondOpinionOf(xml), "");
 }
 
-// The twin: such a namespace excuses nothing else.
-TEST(SecondOpinionTest, IsBadOfATamperedAssertionWithAMalformedNamespace) {
+// Control: such a namespace does not hide another error.
+TEST(SecondOpinionTest, RejectsATamperedAssertionWithAMalformedNamespace) {
   EXPECT_NE(SecondOpinionOf(Replaced(WithMalformedNamespace(), "alice@", "admin@")), "");
   EXPECT_NE(SecondOpinionOf(Replaced(OriginalAssertion(),
                                      "xmlns:saml2=\"urn:oasis:names:tc:SAML:2.0:assertion\"",

@@ -14,8 +14,8 @@
 #include "support/thrown_message.h"
 #include "token/strict_rules.h"
 
-// Forged assertions beside a signed original, in every arrangement: whatever a resolver lets
-// through must be the signed original itself.
+// Forged assertions together with a signed original, in every arrangement: only the signed original
+// itself may be accepted.
 namespace SsoClient::Testing {
 namespace {
 
@@ -38,7 +38,7 @@ bool HoldsForgedSubject(const ElementNode* assertion) {
   return ReadTextContent(*subject->FirstChildElement("NameID")) == "admin@example.com";
 }
 
-// "" if refused, else the name of the accepted subject.
+// The name of the accepted subject; "" if refused.
 template <class Create>
 std::string AcceptedSubject(Create&& create) {
   try {
@@ -81,8 +81,8 @@ INSTANTIATE_TEST_SUITE_P(Arrangements, SignatureWrappingTest,
                                           testing::ValuesIn(AllForgedIds()),
                                           testing::ValuesIn(AllForgedSignatures())));
 
-// The same forgeries read without a resolver where only the signature gives them away, so it is the
-// signature that the tests above see refused.
+// Without a resolver the forgeries that only their signature reveals are accepted. So the tests
+// above fail because of the signature.
 TEST(SignatureWrappingControlTest, ReadsForgeriesWhenNothingIsVerified) {
   const std::string original = OriginalAssertion();
   for (const ForgedSignature signature :
@@ -100,8 +100,8 @@ TEST(SignatureWrappingControlTest, ReadsForgeriesWhenNothingIsVerified) {
   }
 }
 
-// An original whose id is its own verifies in whatever document it stands.
-TEST(SignatureWrappingControlTest, AcceptsTheOriginalBesideAnotherAssertion) {
+// An original with a unique id verifies in every document.
+TEST(SignatureWrappingControlTest, AcceptsTheOriginalNextToAnotherAssertion) {
   const std::string original = OriginalAssertion();
   const auto resolver = TrustedResolver();
   for (const Place place : {Place::kBefore, Place::kAfter, Place::kOriginalInSoapHeader}) {
@@ -116,7 +116,7 @@ TEST(SignatureWrappingControlTest, AcceptsTheOriginalBesideAnotherAssertion) {
   }
 }
 
-// Ids under other names that hold the same value.
+// Id attributes of other names with the same value.
 TEST(SignatureWrappingTest, RefusesASecondElementOfTheSameId) {
   const std::string original = OriginalAssertion();
   const auto resolver = TrustedResolver();
@@ -128,7 +128,7 @@ TEST(SignatureWrappingTest, RefusesASecondElementOfTheSameId) {
   }
 }
 
-// What a signature leaves out of its own digest is no place for another assertion.
+// An assertion is not accepted in a place that the signature's digest does not cover.
 TEST(SignatureWrappingTest, RefusesAnAssertionInTheKeyInfoOfTheOriginal) {
   const std::string original = OriginalAssertion();
   const auto resolver = TrustedResolver();
@@ -137,7 +137,7 @@ TEST(SignatureWrappingTest, RefusesAnAssertionInTheKeyInfoOfTheOriginal) {
     EXPECT_EQ(ThrownMessage<ParseException>(
                   [&] { CreateSamlToken(Arranged(place, forged, original), resolver.get()); }),
               "Token's signature must not hold SAML elements");
-    // The twin: an element of another namespace in the same place leaves the verdict alone.
+    // Control: an element of another namespace in the same place does not change the verdict.
     EXPECT_EQ(AcceptedSubject([&] {
                 return CreateSamlToken(Arranged(place, "<x xmlns=\"urn:x\"/>", original),
                                        resolver.get());
@@ -152,9 +152,9 @@ TEST(SignatureWrappingTest, RefusesSignaturesOutOfTheirPlace) {
   const std::string signature = SignatureOf(original);
   const std::string bare = Replaced(original, signature, "");
   const std::string variants[] = {
-      bare, InsertedBehind(bare, "</saml2:Subject>", signature),
+      bare, InsertedAfter(bare, "</saml2:Subject>", signature),
       Replaced(bare, "</saml2:Assertion>", signature + "</saml2:Assertion>"),
-      InsertedBehind(original, signature, signature),
+      InsertedAfter(original, signature, signature),
       Replaced(bare, "<saml2:Subject>", "<saml2:Subject>" + signature)};
   EXPECT_EQ(CreateSamlToken(original, resolver.get())->Subject().name, "alice");
   for (const std::string& variant : variants) {

@@ -12,14 +12,14 @@
 #include "support/thrown_message.h"
 #include "support/token_values.h"
 
-// Values that something stands in the middle of: a reader that takes the first piece of text for
-// the whole would read another name than was signed.
+// Values that are split by a node. A reader that takes the first piece of text for the whole value
+// would read another name than the signed one.
 namespace SsoClient::Testing {
 namespace {
 
 struct SplitValue {
   const char* name;
-  std::string value;  ///< as it stands once in the text
+  std::string value;  ///< occurs once in the text
   std::size_t at;     ///< where it is split
 };
 
@@ -59,7 +59,7 @@ class SplitValuesTest : public testing::TestWithParam<SplitValue> {
   }
 };
 
-// Whoever writes the signature does not matter here: not even the trusted signer may do so.
+// The signer does not matter: not even the trusted signer may do this.
 TEST_P(SplitValuesTest, AreRefusedAlsoWhenSigned) {
   for (const char* node : {"<!---->", "<!--x-->", "<?p?>", "<?p x?>", "<x/>", "<x>y</x>"}) {
     const std::string xml = SignedXml(SplitBy(UnsignedXml(), GetParam(), node));
@@ -68,14 +68,14 @@ TEST_P(SplitValuesTest, AreRefusedAlsoWhenSigned) {
   }
 }
 
-// A comment leaves the signature good, for its canonical form holds none.
+// A comment does not change the signature, since the canonical form has no comments.
 TEST_P(SplitValuesTest, AreRefusedWhenSplitByACommentAfterwards) {
   const std::string xml = SplitBy(SignedXml(UnsignedXml()), GetParam(), "<!---->");
   ASSERT_TRUE(DevSts::VerifyXml(xml, TrustedCredential().certificatePem));
   ExpectRefused(xml);
 }
 
-// The twin: split by what is text itself, the value is read whole.
+// Control: a value that is split by text is read whole.
 TEST_P(SplitValuesTest, AreReadWholeWhenSplitByText) {
   const auto resolver = TrustedResolver();
   const std::string original = SignedXml(UnsignedXml());

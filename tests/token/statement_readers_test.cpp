@@ -44,7 +44,7 @@ TEST(ReadSamlAttributeTest, LeavesAbsentNamesEmpty) {
   EXPECT_TRUE(attribute.values.empty());
 }
 
-TEST(ReadSamlAttributeTest, ReadsEmptyValuesOnlyWhenToldTo) {
+TEST(ReadSamlAttributeTest, ReadsEmptyValuesOnlyWhenAsked) {
   const std::string text =
       R"(<saml2:Attribute Name="n"><saml2:AttributeValue xsi:type="xs:string"/>)"
       R"(<saml2:AttributeValue>a</saml2:AttributeValue>)"
@@ -155,7 +155,7 @@ TEST(ReadAttributeStatementTest, RefusesAGroupWithoutDomain) {
             "Failed to parse Group Identity value: `staff'; domain or group missing");
 }
 
-TEST(ReadAttributeStatementTest, SetsTheSolutionFlagForTrueAlone) {
+TEST(ReadAttributeStatementTest, SetsTheSolutionFlagForTrueOnly) {
   for (const char* value : {"true", "TRUE", "True"}) {
     EXPECT_TRUE(ReadAttributes(AttributeText(kIsSolutionAttribute, {value})).isSolution) << value;
   }
@@ -235,8 +235,8 @@ TEST(ReadAttributeStatementTest, RefusesByTheReadingRules) {
             "Element 'ds:AttributeStatement' has unexpected namespace");
 }
 
-// A parsed element without characters has no text child; a tree that was built can have an empty
-// one.
+// A parsed element without characters has no text child, but an element of a tree that was built
+// can have an empty one.
 TEST(ReadAttributeStatementTest, DoesNotCountAnEmptyTextAsTrue) {
   Fragment fragment("<saml2:AttributeStatement>" + AttributeText(kIsSolutionAttribute, {"true"}) +
                     "</saml2:AttributeStatement>");
@@ -263,12 +263,12 @@ TEST(ReadAuthnStatementTest, ReadsInstantAndClass) {
   EXPECT_TRUE(fragment.Cursor().IsAtElement("next"));
 }
 
-TEST(ReadAuthnStatementTest, RefusesWhatStandsBehindAnExpectedChild) {
+TEST(ReadAuthnStatementTest, RefusesAnythingAfterAnExpectedChild) {
   for (const char* addition : {"<x/>", "text", "<?p?>"}) {
     EXPECT_EQ(
-        AuthnRefusal(InsertedBehind(kAuthnStatement, "</saml2:AuthnContextClassRef>", addition)),
+        AuthnRefusal(InsertedAfter(kAuthnStatement, "</saml2:AuthnContextClassRef>", addition)),
         "Unexpected elements after AuthnContextClassRef");
-    EXPECT_EQ(AuthnRefusal(InsertedBehind(kAuthnStatement, "</saml2:AuthnContext>", addition)),
+    EXPECT_EQ(AuthnRefusal(InsertedAfter(kAuthnStatement, "</saml2:AuthnContext>", addition)),
               "Unexpected elements after AuthnContext");
   }
 }

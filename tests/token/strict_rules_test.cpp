@@ -225,7 +225,7 @@ TEST(ReadCountAttributeTest, ReadsIntegersThatFit) {
   }
 }
 
-TEST(ReadCountAttributeTest, RefusesWhatIsNoCount) {
+TEST(ReadCountAttributeTest, RefusesWhatIsNotACount) {
   for (const char* text : {"-1", "4294967296", "9223372036854775807", "9223372036854775808",
                            "18446744073709551616", "-9223372036854775809", "1e3", "", " ", " 1",
                            "1 ", "1.0", "0x10", "one", "+", "-", "+-1", "1,000", "\xD9\xA1"}) {

@@ -133,7 +133,7 @@ TEST(ReadSubjectTest, RefusesUnknownMethods) {
   }
 }
 
-// Where something stands behind an expected child, the innermost one first.
+// Places after an expected child, the innermost first.
 constexpr std::pair<const char*, const char*> kEnds[] = {
     {"</ds:X509Certificate>", "Unexpected elements after X509Certificate"},
     {"</ds:X509Data>", "Unexpected elements after X509Data"},
@@ -141,19 +141,20 @@ constexpr std::pair<const char*, const char*> kEnds[] = {
     {"</saml2:SubjectConfirmationData>", "Unexpected elements after SubjectConfirmationData"},
     {"</saml2:SubjectConfirmation>", "Unexpected elements after SubjectConfirmation"}};
 
-TEST(ReadSubjectTest, RefusesWhatStandsBehindAnExpectedChild) {
+TEST(ReadSubjectTest, RefusesAnythingAfterAnExpectedChild) {
   for (const auto& [anchor, message] : kEnds) {
     for (const char* addition : {"<x/>", "text", "<?pi?>"}) {
-      EXPECT_EQ(Refusal(InsertedBehind(HolderOfKeyText(), anchor, addition)), message);
+      EXPECT_EQ(Refusal(InsertedAfter(HolderOfKeyText(), anchor, addition)), message);
     }
   }
 }
 
-// Something stands behind every child: each message shows once the children inside are repaired.
+// There is an unexpected element after every child. Each message appears once the inner ones are
+// repaired.
 TEST(ReadSubjectTest, NamesTheInnermostFaultFirst) {
   std::string text = HolderOfKeyText();
   for (const auto& [anchor, message] : kEnds) {
-    text = InsertedBehind(text, anchor, "<x/>");
+    text = InsertedAfter(text, anchor, "<x/>");
   }
   for (const auto& [anchor, message] : kEnds) {
     EXPECT_EQ(Refusal(text), message);
@@ -162,7 +163,7 @@ TEST(ReadSubjectTest, NamesTheInnermostFaultFirst) {
   EXPECT_EQ(Read(text).principal.name, "alice");
 }
 
-TEST(ReadSubjectTest, JudgesTheMethodBeforeWhatItConfirms) {
+TEST(ReadSubjectTest, ChecksTheMethodBeforeWhatItConfirms) {
   const std::string text = Replaced(BearerText(), "cm:bearer", "cm:other");
   EXPECT_EQ(Refusal(Replaced(text, "<saml2:SubjectConfirmationData ", "<x ")),
             "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:other'");
@@ -174,13 +175,13 @@ TEST(ReadSubjectTest, JudgesTheMethodBeforeWhatItConfirms) {
 }
 
 TEST(ReadSubjectTest, RefusesASecondCertificateOrConfirmation) {
-  EXPECT_EQ(Refusal(InsertedBehind(HolderOfKeyText(), "</ds:X509Certificate>",
-                                   "<ds:X509Certificate>AA==</ds:X509Certificate>")),
+  EXPECT_EQ(Refusal(InsertedAfter(HolderOfKeyText(), "</ds:X509Certificate>",
+                                  "<ds:X509Certificate>AA==</ds:X509Certificate>")),
             "Unexpected elements after X509Certificate");
   const std::string confirmation = BearerText().substr(
       BearerText().find("<saml2:SubjectConfirmation "),
       BearerText().find("</saml2:Subject>") - BearerText().find("<saml2:SubjectConfirmation "));
-  EXPECT_EQ(Refusal(InsertedBehind(BearerText(), "</saml2:SubjectConfirmation>", confirmation)),
+  EXPECT_EQ(Refusal(InsertedAfter(BearerText(), "</saml2:SubjectConfirmation>", confirmation)),
             "Unexpected elements after SubjectConfirmation");
 }
 
@@ -248,13 +249,13 @@ TEST(ReadSubjectTest, RefusesBearerDataOfATypeThatCannotBeNamed) {
                 " uses undefined prefix: `unbound'");
 }
 
-// A type that calls for a key does not make room for one.
+// A type that requires a key does not allow one in bearer data.
 TEST(ReadSubjectTest, RefusesABearerKeyWhateverTheType) {
   EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), "cm:holder-of-key", "cm:bearer")),
             "Element 'saml2:SubjectConfirmationData' must be empty");
 }
 
-TEST(ReadSubjectTest, RefusesBearerDataThatSaysMore) {
+TEST(ReadSubjectTest, RefusesBearerDataWithFurtherContent) {
   const std::string end = "Z\"/>";
   EXPECT_EQ(Refusal(Replaced(BearerText(), end, "Z\" Recipient=\"urn:r\"/>")),
             "Unexpected attribute 'Recipient' on element 'saml2:SubjectConfirmationData'");

@@ -9,8 +9,8 @@
 #include "support/thrown_message.h"
 #include "support/token_values.h"
 
-// Edits of a signed token's text: those that its canonical form ignores change nothing that a
-// caller sees, those of a value that is read are seen as tampering.
+// Edits of a signed token's text: edits that its canonical form ignores change no value, and edits
+// of a value are refused as tampering.
 namespace SsoClient::Testing {
 namespace {
 
@@ -58,10 +58,10 @@ TEST(NeutralEditTest, AcceptsTextAroundTheDocumentElement) {
             AllValues(*CreateSamlToken(SignedXml(), resolver.get())));
 }
 
-// The name in xsi:type hangs on a declaration that exclusive canonical text leaves out where no
-// element or attribute uses it: whoever changes that changes nothing that is signed, and gains
+// The name in xsi:type depends on a declaration that exclusive canonical text omits if no element
+// or attribute uses its prefix. So it can be changed without breaking the signature, but that gains
 // nothing.
-TEST(PrefixEditTest, OfATypesNamespaceLeavesNoTypeThatIsKnown) {
+TEST(PrefixEditTest, OfATypesNamespaceMakesTheTypeUnknown) {
   AssertionText text;
   text.advice.clear();
   const std::string original = text.ToSignedXml(TrustedCredential());
@@ -80,9 +80,9 @@ TEST(PrefixEditTest, OfATypesNamespaceLeavesNoTypeThatIsKnown) {
 
 class ValueEditTest : public testing::TestWithParam<Edit> {};
 
-TEST_P(ValueEditTest, IsSeenAsTampering) {
+TEST_P(ValueEditTest, IsRefusedAsTampering) {
   const std::string edited = Replaced(SignedXml(), GetParam().from, GetParam().to);
-  // The twin: without a resolver nothing is wrong with the text.
+  // Control: without a resolver the text is accepted.
   EXPECT_NO_THROW(CreateSamlToken(edited));
   EXPECT_THROW(CreateSamlToken(edited, TrustedResolver().get()), InvalidSignatureException);
 }

@@ -13,7 +13,7 @@
 #include "support/assertion_text.h"
 #include "support/parse_xml.h"
 
-// The time that a token takes grows as its size does, whatever is in it.
+// The time to read a token is linear in its size, whatever it contains.
 namespace SsoClient::Testing {
 namespace {
 
@@ -28,8 +28,8 @@ std::string Repeated(const std::string& text, std::size_t count) {
 AssertionText ManyAudiences(std::size_t count) {
   AssertionText text;
   text.conditions =
-      InsertedBehind(text.conditions, "<saml2:AudienceRestriction>",
-                     Repeated("<saml2:Audience>https://c.example</saml2:Audience>", count));
+      InsertedAfter(text.conditions, "<saml2:AudienceRestriction>",
+                    Repeated("<saml2:Audience>https://c.example</saml2:Audience>", count));
   return text;
 }
 
@@ -93,7 +93,7 @@ class TokenScalingTest : public testing::TestWithParam<Shape> {
     return GetParam().make(GetParam().count * factor).ToSignedXml(TrustedCredential());
   }
 
-  // Each doubling may cost 2.5 times the time; a quadratic step costs four times.
+  // Each doubling may take 2.5 times as long; a quadratic step takes four times as long.
   static void ExpectLinear(const std::function<void(const std::string&)>& use) {
     const std::string small = SignedXml(1);
     const std::string large = SignedXml(4);
@@ -105,11 +105,11 @@ class TokenScalingTest : public testing::TestWithParam<Shape> {
   const Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> resolver_ = TrustedResolver();
 };
 
-TEST_P(TokenScalingTest, OfVerifyingAText) {
+TEST_P(TokenScalingTest, VerifyingATextIsLinear) {
   ExpectLinear([&](const std::string& xml) { CreateSamlToken(xml, resolver_.get()); });
 }
 
-TEST_P(TokenScalingTest, OfVerifyingAnElementAndItsCanonicalText) {
+TEST_P(TokenScalingTest, VerifyingAnElementAndItsCanonicalTextIsLinear) {
   ExpectLinear([&](const std::string& xml) {
     const auto document = ParseXml(xml);
     CreateSamlTokenFromDom(document->RootElement(), resolver_.get());

@@ -75,7 +75,7 @@ TEST(ReadSignatureTest, RefusesAnythingButAnElementInItsPlace) {
   }
 }
 
-TEST(ReadSignatureTest, TellsThePlatformsSyntaxFault) {
+TEST(ReadSignatureTest, ReportsThePlatformsSyntaxError) {
   const std::string cases[] = {
       "<saml2:Subject/>",
       "<Signature/>",
@@ -115,7 +115,7 @@ TEST(ReadSignatureTest, RefusesSamlElementsAnywhereInKeyInfo) {
   }
 }
 
-TEST(ReadSignatureTest, JudgesFormThenCoverageThenKeyInfo) {
+TEST(ReadSignatureTest, ChecksFormThenCoverageThenKeyInfo) {
   const std::string uncovering = WithKeyInfo(MadeUpSignature("#other"), "<saml2:Assertion/>");
   EXPECT_EQ(Refusal(Replaced(uncovering, "<ds:DigestValue>AA", "<ds:DigestValue>AA<!---->"))
                 .rfind("Signature syntax error: ", 0),
@@ -123,7 +123,7 @@ TEST(ReadSignatureTest, JudgesFormThenCoverageThenKeyInfo) {
   EXPECT_EQ(Refusal(uncovering), "Token's signature must cover the entire token");
 }
 
-// A signature whose verdict the test gives.
+// A signature whose verdict the test sets.
 class FakeSignature final : public Signature, public Tarnik::ObjectImpl {
  public:
   explicit FakeSignature(std::function<bool(const KeyInfoResolver*)> verify)
@@ -169,7 +169,7 @@ TEST(VerifySignatureTest, RefusesAFalseVerdict) {
             "Failed to verify signature: token might have been tampered with.");
 }
 
-TEST(VerifySignatureTest, TellsThePlatformsFault) {
+TEST(VerifySignatureTest, ReportsThePlatformsError) {
   const auto signature = Tarnik::MakeRef<FakeSignature>([](const KeyInfoResolver*) -> bool {
     throw Tarnik::Xml::Security::XmlSecurityException("no trusted key");
   });
@@ -177,7 +177,7 @@ TEST(VerifySignatureTest, TellsThePlatformsFault) {
             "Signature verification error. no trusted key");
 }
 
-TEST(VerifySignatureTest, PassesOtherFaults) {
+TEST(VerifySignatureTest, PassesOtherErrorsOn) {
   const auto signature = Tarnik::MakeRef<FakeSignature>([](const KeyInfoResolver*) -> bool {
     throw Tarnik::InvalidStateException("resolver broken");
   });

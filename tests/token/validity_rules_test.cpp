@@ -37,7 +37,7 @@ ParsedAssertion ValidAssertion() {
   return assertion;
 }
 
-// "" if the assertion is accepted.
+// The error message; "" if the assertion is accepted.
 std::string Refusal(const ParsedAssertion& assertion, long tolerance = 600, long now = kStart) {
   try {
     CheckValidity(assertion, tolerance, At(now));
@@ -66,7 +66,7 @@ TEST(CheckValidityTest, AcceptsOnlyVersion20) {
   }
 }
 
-TEST(CheckValidityTest, WantsAnIdThatBeginsWithAnUnderscore) {
+TEST(CheckValidityTest, RequiresAnIdThatBeginsWithAnUnderscore) {
   for (const char* id : {"", "a1", " _a1", "-_"}) {
     ParsedAssertion assertion = ValidAssertion();
     assertion.id = id;
@@ -77,7 +77,7 @@ TEST(CheckValidityTest, WantsAnIdThatBeginsWithAnUnderscore) {
   EXPECT_EQ(Refusal(underscore), "");
 }
 
-TEST(CheckValidityTest, WantsAPeriodThatIsNotEmpty) {
+TEST(CheckValidityTest, RequiresAPeriodThatIsNotEmpty) {
   const std::string message =
       "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.";
   for (const long end : {kStart, kStart - 1}) {
@@ -100,7 +100,7 @@ struct ClockCase {
 
 class CheckValidityAtTimeTest : public testing::TestWithParam<ClockCase> {};
 
-TEST_P(CheckValidityAtTimeTest, JudgesThePeriod) {
+TEST_P(CheckValidityAtTimeTest, ChecksThePeriod) {
   EXPECT_EQ(Refusal(ValidAssertion(), GetParam().tolerance, GetParam().now), GetParam().refusal);
 }
 
@@ -119,13 +119,13 @@ INSTANTIATE_TEST_SUITE_P(
         // a negative tolerance narrows the period
         ClockCase{kStart + 1, -1, kInFuture}, ClockCase{kStart + kSecond, -1, ""},
         ClockCase{kEnd - kSecond, -1, kExpired}, ClockCase{kEnd - kSecond - 1, -1, ""},
-        // tolerances that 64 bits of microseconds can not hold
+        // tolerances that do not fit into 64 bits of microseconds
         ClockCase{kEnd + 1'000'000 * kSecond, kLongest, ""},
         ClockCase{kStart - 1'000'000 * kSecond, kLongest, ""},
         ClockCase{kStart + 1, kShortest, kInFuture},
         ClockCase{kEnd + 1, kLongest / kSecond + 1, ""}));
 
-// The text form of a time tells it in the zone that it was written in.
+// The text form of a time is in the zone in which it was written.
 TEST(CheckValidityTest, NamesTimesAsTheTokenWroteThem) {
   ParsedAssertion assertion = ValidAssertion();
   assertion.conditions.notBefore = DateTime::Parse("2024-03-05T09:08:09.010+02:00");
@@ -136,7 +136,7 @@ TEST(CheckValidityTest, NamesTimesAsTheTokenWroteThem) {
   EXPECT_EQ(Refusal(assertion, 0, kEnd - 1), "");
 }
 
-TEST(CheckValidityTest, WantsABearerConfirmationAsLongAsTheToken) {
+TEST(CheckValidityTest, RequiresABearerConfirmationAsLongAsTheToken) {
   ParsedAssertion assertion = ValidAssertion();
   EXPECT_EQ(Refusal(assertion), "");
   assertion.subject.notOnOrAfter = At(kEnd - 1);
@@ -156,7 +156,7 @@ std::vector<Delegate> Chain() {
   return {{{"first", "d"}, At(kStart)}, {{"second", "d"}, At(kStart)}};
 }
 
-TEST(CheckValidityTest, WantsDelegateIdAndRestrictionTogether) {
+TEST(CheckValidityTest, RequiresDelegateIdAndRestrictionTogether) {
   ParsedAssertion restriction = ValidAssertion();
   restriction.conditions.delegationChain = Chain();
   EXPECT_EQ(Refusal(restriction),
@@ -169,7 +169,7 @@ TEST(CheckValidityTest, WantsDelegateIdAndRestrictionTogether) {
             "present");
 }
 
-TEST(CheckValidityTest, WantsTheDelegateIdOfTheLastDelegate) {
+TEST(CheckValidityTest, RequiresTheDelegateIdOfTheLastDelegate) {
   ParsedAssertion assertion = ValidAssertion();
   assertion.conditions.delegationChain = Chain();
   assertion.subject.delegateId = PrincipalId{"second", "d"};

@@ -181,7 +181,7 @@ TEST_F(HttpsSessionAsyncTest, ReportsTheAnswerOnce) {
   EXPECT_EQ(body_, "answer");
 }
 
-TEST_F(HttpsSessionAsyncTest, LetsGoOfTheAnswerBehindTheCallback) {
+TEST_F(HttpsSessionAsyncTest, ReleasesTheAnswerAfterTheCallback) {
   long during = 0;
   session_.SendRequestAsync(
       request_,
@@ -218,7 +218,7 @@ TEST_F(HttpsSessionAsyncTest, AnEmptyCallbackFailsWhenTheExchangeEnds) {
   EXPECT_THROW(agent_->completions[0](nullptr, response.get(), nullptr), std::bad_function_call);
 }
 
-TEST_F(HttpsSessionTest, OperationsStandInTheirOrder) {
+TEST_F(HttpsSessionTest, OperationsKeepTheirSlotOrder) {
   static_assert(!std::has_virtual_destructor_v<TransportSession>);
   const TransportSession& session = session_;
   using Send = void(const void*, const SoapRequest&, Tarnik::Ref<Tarnik::Reader>&);
@@ -232,7 +232,7 @@ TEST_F(HttpsSessionTest, OperationsStandInTheirOrder) {
   EXPECT_EQ(handle, agent_->item);
 }
 
-/// Sends in either way and gives the body of the answer.
+/// Both send a request and return the body of the answer.
 std::string SendNow(const HttpsSession& session, const SoapRequest& request) {
   Tarnik::Ref<Tarnik::Reader> reader;
   session.SendRequest(request, reader);

@@ -62,7 +62,7 @@ void CheckSpecSlots(const Make& make) {
   EXPECT_FALSE(recorder.hasError);
   recorder.lastStream->Close();
 
-  // Slot 4 destroys, slot 5 also frees; a sanitizer sees when they do not.
+  // Slot 4 destroys, slot 5 also frees; a sanitizer detects it if they do not.
   const auto* freed = make(1);
   Tarnik::WeakRef freedWeak;
   freed->AttachWeakRef(freedWeak);

@@ -27,7 +27,7 @@ Tarnik::Ref<SsoCustomConnectionSpecImpl> MakePlainSpec(const std::string& host, 
   return Tarnik::MakeRef<SsoCustomConnectionSpecImpl>(host, port, flag);
 }
 
-TEST(SsoCustomConnectionSpecImplTest, TellsTheConfiguredEndpoint) {
+TEST(SsoCustomConnectionSpecImplTest, ReturnsTheConfiguredEndpoint) {
   for (const bool flag : {false, true}) {
     const auto spec = MakePlainSpec("sts.example", 443, flag);
     EXPECT_EQ(spec->Host(), "sts.example");
@@ -51,7 +51,7 @@ TEST(SsoCustomConnectionSpecImplTest, DescribesItselfByAddressAndEndpoint) {
             "<cs p:" + address.str() + ", SsoCustomConnectionSpec:sts.example:443>");
 }
 
-TEST(SsoCustomConnectionSpecImplTest, AllSlotsStandInTheirOrder) {
+TEST(SsoCustomConnectionSpecImplTest, KeepsItsSlotOrder) {
   CheckSpecSlots(
       [](int port) { return new SsoCustomConnectionSpecImpl("127.0.0.1", port, false); });
 }
@@ -91,7 +91,7 @@ TEST(SsoCustomConnectionSpecImplTest, ServesConcurrentConnects) {
 }
 
 TEST(SsoCustomConnectionSpecImplTest, ReportsAFailedConnectOnce) {
-  const LoopbackSocket deaf;  // bound, but nobody listens: refused
+  const LoopbackSocket deaf;  // bound but not listening: refused
   ConnectRecorder recorder;
   MakePlainSpec("127.0.0.1", deaf.Port())->StartConnect(recorder.Completion());
   recorder.Wait();
@@ -137,7 +137,7 @@ class SsoCustomSslConnectionSpecImplTest : public testing::Test {
   Tarnik::Ref<FakeSslContext> context_ = Tarnik::MakeRef<FakeSslContext>();
 };
 
-TEST_F(SsoCustomSslConnectionSpecImplTest, TellsAllAsItsInnerSpecDoes) {
+TEST_F(SsoCustomSslConnectionSpecImplTest, DescribesItselfAsItsInnerSpecDoes) {
   const auto inner = Tarnik::MakeRef<SsoCustomConnectionSpecImpl>("host", 443, true);
   const auto spec = Tarnik::MakeRef<SsoCustomSslConnectionSpecImpl>(context_.get(), "peer", inner);
   EXPECT_EQ(spec->ToString(), inner->ToString());
@@ -147,7 +147,7 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, TellsAllAsItsInnerSpecDoes) {
   EXPECT_FALSE(spec->IsProxy());
 }
 
-TEST_F(SsoCustomSslConnectionSpecImplTest, AllSlotsStandInTheirOrder) {
+TEST_F(SsoCustomSslConnectionSpecImplTest, KeepsItsSlotOrder) {
   CheckSpecSlots([this](int port) {
     return new SsoCustomSslConnectionSpecImpl(
         context_.get(), "", Tarnik::MakeRef<SsoCustomConnectionSpecImpl>("127.0.0.1", port, false));
@@ -210,7 +210,7 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, AHandshakeThatCannotBeginIsReportedOn
 }
 
 TEST_F(SsoCustomSslConnectionSpecImplTest, AFailedConnectNeverStartsAHandshake) {
-  const LoopbackSocket deaf;  // bound, but nobody listens: refused
+  const LoopbackSocket deaf;  // bound but not listening: refused
   ConnectRecorder recorder;
   MakeSpec("127.0.0.1", deaf.Port())->StartConnect(recorder.Completion());
   recorder.Wait();
@@ -252,7 +252,7 @@ TEST_F(SsoCustomSslConnectionSpecImplDeathTest, AnEmptyCompletionFailsOnTheIoThr
   testing::GTEST_FLAG(death_test_style) = "threadsafe";
   EXPECT_DEATH(
       {
-        const LoopbackSocket deaf;  // bound, but nobody listens: refused
+        const LoopbackSocket deaf;  // bound but not listening: refused
         MakeSpec("127.0.0.1", deaf.Port())->StartConnect(nullptr);
         std::promise<void>().get_future().wait_for(std::chrono::seconds(20));
       },
@@ -285,7 +285,7 @@ TEST(ConnectionSpecsTest, MakeATlsSpecAroundAPlainOneAndReleaseWhatWasHeld) {
   EXPECT_THAT(custom->ToString(), testing::EndsWith(", SsoCustomConnectionSpec:sts.example:8443>"));
 }
 
-TEST(ConnectionSpecsTest, JudgeNoneOfTheirArguments) {
+TEST(ConnectionSpecsTest, DoNotCheckTheirArguments) {
   Tarnik::Ref<ConnectionSpec> spec;
   CreateSsoConnectionSpec("", -1, false, spec);
   EXPECT_EQ(dynamic_cast<const CustomConnectionSpec&>(*spec).EndpointKey(), ":-1");

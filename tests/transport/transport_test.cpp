@@ -19,8 +19,9 @@ TEST(SoapRequestTest, HoldsTheActionAndThenTheBody) {
   EXPECT_EQ(second, "the body");
 }
 
-TEST(SoapRequestTest, CleansesItsBodyWhenItDies) {
-  const std::string secret = "hunter2-secret";  // short enough to stand in the string object itself
+TEST(SoapRequestTest, CleansesItsBodyWhenItIsDestroyed) {
+  const std::string secret =
+      "hunter2-secret";  // short enough to be stored in the string object itself
   alignas(SoapRequest) std::array<unsigned char, sizeof(SoapRequest)> storage{};
   auto* request = new (storage.data()) SoapRequest();
   request->body = secret;

@@ -101,7 +101,7 @@ TEST(ElementBuilderImplTest, PassesOnWhatNamesAreRefused) {
             "An attribute name of element 'a:E' is not a qualified name.");
 }
 
-TEST(ElementBuilderImplTest, EscapesWhatXmlCanCarry) {
+TEST(ElementBuilderImplTest, EscapesMarkupAndWhiteSpace) {
   const std::string value = "<&>\"'\r\n\t]]>";
   const auto text = BuiltXml(ElementBuilderImpl("", "E", {{"a", value}}));
   EXPECT_EQ(ParseXml(text)->RootElement()->FindAttribute("a"), value);
@@ -151,8 +151,9 @@ TEST(TextElementBuilderImplTest, WhatIsReadBackIsTheTextThatWasGiven) {
   }
 }
 
-TEST(TextElementBuilderImplTest, CleansesItsTextWhenItDies) {
-  const std::string secret = "hunter2-secret";  // short enough to stand in the string object itself
+TEST(TextElementBuilderImplTest, CleansesItsTextWhenItIsDestroyed) {
+  const std::string secret =
+      "hunter2-secret";  // short enough to be stored in the string object itself
   alignas(TextElementBuilderImpl) std::array<unsigned char, sizeof(TextElementBuilderImpl)>
       storage{};
   auto* builder = new (storage.data()) TextElementBuilderImpl("a", "E", secret, {});
@@ -286,7 +287,7 @@ TEST(XMLCompositeBuilderTest, FailuresOfAChildPassUnchangedAndLeaveAPart) {
   EXPECT_EQ(XmlText(out.get()), "<Root><First/></Root>");
 }
 
-/// Keeps what the output held before each build.
+/// Records what the output held before each build.
 class WatchingBuilder final : public XMLBaseBuilder {
  public:
   void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const override {
@@ -329,7 +330,7 @@ TEST(XMLCompositeBuilderTest, ManyThreadsMayBuildOneTree) {
   EXPECT_THAT(built, testing::Each(expected));
 }
 
-TEST(XMLBaseBuilderTest, BuildStandsFirstAndTheDestructorFollows) {
+TEST(XMLBaseBuilderTest, BuildIsTheFirstSlotAndTheDestructorFollows) {
   const auto builder = MakeTextElementBuilder("a", "E", "text");
   using BuildFunction = void(const void*, Tarnik::Ref<Tarnik::Xml::ElementNode>&);
   Tarnik::Ref<Tarnik::Xml::ElementNode> out;

@@ -193,7 +193,7 @@ TEST(IssueBodyTest, AnyKeyTypeButZeroAsksForAPublicKey) {
   }
 }
 
-TEST(IssueBodyTest, UseKeyStandsLastForKeyTypeOneAlone) {
+TEST(IssueBodyTest, UseKeyIsLastForKeyTypeOneOnly) {
   EXPECT_THAT(UseKeyBodyXml(1, PlainSpec()),
               EndsWith(std::string(kUseKey) + "</wst:RequestSecurityToken>"));
   EXPECT_EQ(UseKeyBodyXml(0, PlainSpec()), BodyXml(0, PlainSpec()));
@@ -244,7 +244,7 @@ TEST(IssueBodyTest, TheActAsTokenMustBeAToken) {
   EXPECT_THROW(BuildIssueBody(0, spec), Tarnik::Xml::XMLParseException);
 }
 
-TEST(IssueBodyTest, WhatXmlCannotCarryIsRefusedByElement) {
+TEST(IssueBodyTest, CharactersThatXmlForbidsAreRefusedByElement) {
   const struct {
     const char* element;
     void (*put)(TokenSpec&, const std::string&);
@@ -307,7 +307,7 @@ TEST(RenewBodyTest, RefusesATokenWhoseTextIsMalformed) {
   EXPECT_THROW(Built(*BuildRenewBody(token, 600)), Tarnik::Xml::XMLParseException);
 }
 
-TEST(ValidateBodyTest, HoldsTheTokenAndNothingOfALifetime) {
+TEST(ValidateBodyTest, HoldsTheTokenAndNoLifetime) {
   const FakeSamlToken token("<s:Assertion xmlns:s=\"urn:s\"/>");
   EXPECT_EQ(BuiltXml(*BuildValidateBody(token)),
             "<wst:RequestSecurityToken"
@@ -330,7 +330,7 @@ constexpr char kExchangeStart[] =
     "oasis-200401-wss-soap-message-security-1.0#Base64Binary\""
     " ValueType=\"http://schemas.xmlsoap.org/ws/2005/02/trust/spnego\">";
 
-TEST(BinaryExchangeTest, CarriesTheLegInBase64) {
+TEST(BinaryExchangeTest, HoldsTheLegInBase64) {
   EXPECT_EQ(BuiltXml(*BuildBinaryExchange({0x00, 0xFF, 0x10, 0x80})),
             std::string(kExchangeStart) + "AP8QgA==</wst:BinaryExchange>");
 }
@@ -350,14 +350,14 @@ std::string ContextOf(const Tarnik::Xml::ElementNode& element) {
   return std::string(element.FindAttribute("Context").value_or("none"));
 }
 
-TEST(XMLBodyBuilderInitialSPNegoTest, IsAnIssueBodyWithTheLegBehindAndAContext) {
+TEST(XMLBodyBuilderInitialSPNegoTest, IsAnIssueBodyFollowedByTheLegAndWithAContext) {
   for (const unsigned keyType : {0U, 1U}) {
     const auto element = Built(XMLBodyBuilderInitialSPNego(keyType, OneMinute(), {1, 2, 3}));
     const auto expected = BuildIssueBodyWithUseKey(keyType, OneMinute());
     expected->Add(BuildBinaryExchange({1, 2, 3}));
     const auto attribute = " Context=\"" + ContextOf(*element) + "\"";
     auto xml = XmlText(element.get());
-    // Behind the declarations.
+    // After the declarations.
     const std::size_t position = xml.find(attribute + ">");
     ASSERT_NE(position, std::string::npos);
     xml.erase(position, attribute.size());
@@ -365,7 +365,7 @@ TEST(XMLBodyBuilderInitialSPNegoTest, IsAnIssueBodyWithTheLegBehindAndAContext) 
   }
 }
 
-TEST(XMLBodyBuilderInitialSPNegoTest, TheUseKeyStandsBeforeTheLeg) {
+TEST(XMLBodyBuilderInitialSPNegoTest, TheUseKeyPrecedesTheLeg) {
   const auto xml = BuiltXml(XMLBodyBuilderInitialSPNego(1, OneMinute(), {1}));
   EXPECT_LT(xml.find("<wst:UseKey"), xml.find("<wst:BinaryExchange"));
   EXPECT_THAT(BuiltXml(XMLBodyBuilderInitialSPNego(0, OneMinute(), {1})), Not(HasSubstr("UseKey")));

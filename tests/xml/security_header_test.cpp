@@ -42,7 +42,7 @@ TEST(SecurityHeaderTest, IsValidFromNowForTheMinutesAsked) {
 
 TEST(SecurityHeaderTest, WrapsMoreThan35Minutes) {
   const auto header = Built(*BuildSecurityHeader(36));
-  // What is written has no microseconds.
+  // The written times have no microseconds.
   EXPECT_NEAR(TimeAt(*header, {"Timestamp", "Expires"}).GetUtcTime() -
                   TimeAt(*header, {"Timestamp", "Created"}).GetUtcTime(),
               2'160'000'000 - 4'294'967'296, 1000);
@@ -55,7 +55,7 @@ constexpr char kPasswordStart[] =
     "<wsse:Password Type=\"http://docs.oasis-open.org/wss/2004/01/"
     "oasis-200401-wss-username-token-profile-1.0#PasswordText\">";
 
-TEST(UsernameTokenTest, HoldsTheUserAlone) {
+TEST(UsernameTokenTest, HoldsOnlyTheUser) {
   EXPECT_EQ(BuiltXml(*BuildUsernameToken("alice")),
             std::string(kUsernameTokenStart) +
                 "<wsse:Username>alice</wsse:Username></wsse:UsernameToken>");
@@ -73,7 +73,7 @@ TEST(UsernameTokenTest, WritesEmptyTexts) {
                 "</wsse:Password></wsse:UsernameToken>");
 }
 
-TEST(BinarySecurityTokenTest, CarriesTheCertificateInOneLine) {
+TEST(BinarySecurityTokenTest, HoldsTheCertificateInOneLine) {
   const auto certificate = ConfigOf(KeyCredential()).certificate;
   const std::vector<unsigned char> der(certificate->DerBytes(),
                                        certificate->DerBytes() + certificate->DerLength());

@@ -143,7 +143,7 @@ Ref<Tarnik::Xml::Security::Signature> SignatureOf(const ElementNode& envelope) {
       At(envelope, {"Header", "Security"}).FirstChildElement("Signature"));
 }
 
-/// What ds:KeyInfo holds, all of it.
+/// The whole content of ds:KeyInfo.
 std::string KeyInfoText(const ElementNode& envelope) {
   std::string text;
   const auto& keyInfo = At(envelope, {"Header", "Security", "Signature", "KeyInfo"});
@@ -168,7 +168,7 @@ TEST(XMLSignedSoapBuilderTest, SignsTheBodyAndThenTheTimestamp) {
   }
 }
 
-TEST(XMLSignedSoapBuilderTest, TheWrittenRequestVerifiesElsewhere) {
+TEST(XMLSignedSoapBuilderTest, AnotherImplementationVerifiesTheWrittenRequest) {
   const auto text = BuiltXml(*CertificateForm());
   const auto verdict = DevSts::VerifyXml(text, Credential().certificatePem);
   EXPECT_TRUE(verdict.valid) << verdict.reason;
@@ -177,7 +177,7 @@ TEST(XMLSignedSoapBuilderTest, TheWrittenRequestVerifiesElsewhere) {
   EXPECT_FALSE(DevSts::VerifyXml(changed, Credential().certificatePem).valid);
 }
 
-TEST(XMLSignedSoapBuilderTest, TheSignatureIsTheLastOfTheHeaderAndBearsItsId) {
+TEST(XMLSignedSoapBuilderTest, TheSignatureIsLastInTheHeaderAndHasItsId) {
   const auto envelope = Built(*CertificateForm());
   const auto& security = At(*envelope, {"Header", "Security"});
   EXPECT_THAT(ChildNames(security),
@@ -225,7 +225,7 @@ TEST(XMLSignedSoapBuilderTest, NewIdsAreTheLocalNameAndAUuid) {
   const auto& timestamp = At(*envelope, {"Header", "Security", "Timestamp"});
   EXPECT_THAT(IdOf(At(*envelope, {"Body"})), testing::MatchesRegex("Body[0-9a-f-]{36}"));
   EXPECT_THAT(IdOf(timestamp), testing::MatchesRegex("Timestamp[0-9a-f-]{36}"));
-  // The declaration that is there already is not written twice.
+  // An existing declaration is not repeated.
   EXPECT_THAT(AttributeNames(timestamp), ElementsAre("xmlns:wsu", "wsu:Id"));
   EXPECT_THAT(AttributeNames(At(*envelope, {"Body"})),
               ElementsAre("xmlns:wst", "xmlns:wsu", "wsu:Id"));
@@ -242,7 +242,7 @@ TEST(XMLSignedSoapBuilderTest, AnElementKeepsTheIdThatItHas) {
   EXPECT_EQ(SignatureOf(*envelope)->References()[1].uri, "#mine");
 }
 
-TEST(XMLSignedSoapBuilderTest, OnlyNamespacesTellTheTimestampAndItsId) {
+TEST(XMLSignedSoapBuilderTest, FindsTheTimestampAndItsIdByNamespace) {
   auto security = MakeCompositeBuilder("s", "Security", {{"xmlns:s", kWsseNamespace}});
   security->Add(MakeElementBuilder("x", "Timestamp", {{"x:Id", "x"}, {"xmlns:x", "urn:other"}}))
       .Add(MakeElementBuilder(

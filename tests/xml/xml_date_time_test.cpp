@@ -62,7 +62,7 @@ TEST(XmlDateTimeTest, WrapsTheMicrosecondsBeyond35Minutes) {
   }
 }
 
-TEST(XmlDateTimeTest, TellsTheSumInUtc) {
+TEST(XmlDateTimeTest, GivesTheSumInUtc) {
   const LocalZone zone;
   EXPECT_EQ(FormatXmlDateTime(AddMinutes(DateTime::Parse("2024-03-05T07:08:09+01:00"), 1)),
             "2024-03-05T06:09:09.000Z");

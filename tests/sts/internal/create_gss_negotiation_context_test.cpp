@@ -123,7 +123,7 @@ TEST_F(CreateGssNegotiationContextTest, AContextHoldsWhatItUsesAndReleasesIt) {
   EXPECT_EQ(counts(), before);
 }
 
-TEST_F(CreateGssNegotiationContextTest, JudgesWhatItReads) {
+TEST_F(CreateGssNegotiationContextTest, ChecksTheConfiguration) {
   SecurityTokenServiceConfig config;
   config.url = "https://sts.example/";
   EXPECT_THROW(CreateGssNegotiationContext(config, OneHour()), Tarnik::InvalidArgumentException);

@@ -46,7 +46,7 @@ class GssNegotiationContextImplTest : public testing::Test {
   std::shared_ptr<GssNegotiationContext> context_;
 };
 
-TEST_F(GssNegotiationContextImplTest, TheFirstLegCarriesTheSpecAndTheSecondTheContext) {
+TEST_F(GssNegotiationContextImplTest, TheFirstLegHasTheSpecAndTheSecondTheContext) {
   Answer({LegAnswer("c1"), LegAnswer("c2")});
   const auto first = context_->Negotiate({7});
   ASSERT_NE(first.outputLeg, nullptr);
@@ -79,8 +79,8 @@ TEST_F(GssNegotiationContextImplTest, ATokenMayComeWithALeg) {
   EXPECT_NE(result.token, nullptr);
 }
 
-// Tokens end one hour after the time that they are made for.
-TEST_F(GssNegotiationContextImplTest, ATokenIsJudgedWithTenMinutesForTheClocks) {
+// A token expires one hour after the time given to its text.
+TEST_F(GssNegotiationContextImplTest, ATokenIsCheckedWithTenMinutesOfTolerance) {
   const auto answerEndedBefore = [](long seconds) {
     const auto now = Tarnik::System::GetUtcDateTime().GetUtcTime();
     return LastLegAnswer(
@@ -98,7 +98,7 @@ TEST_F(GssNegotiationContextImplTest, ATokenIsVerifiedWithTheResolver) {
   EXPECT_NE(context_->Negotiate({7}).token, nullptr);
 }
 
-TEST_F(GssNegotiationContextImplTest, ARefusedTokenHasNamedTheNegotiationAllTheSame) {
+TEST_F(GssNegotiationContextImplTest, ARefusedTokenStillSetsTheContext) {
   const auto text = AssertionText();
   Answer({LastLegAnswer(text.ToSignedXml(StrangerCredential()))}, OneHour(), TrustedResolver());
   EXPECT_THROW(context_->Negotiate({7}), InvalidSignatureException);
@@ -132,7 +132,7 @@ TEST_F(GssNegotiationContextImplTest, AFaultKeepsTheContextOfTheLegBefore) {
   EXPECT_THAT(transport_->bodies[2], HasSubstr("Context=\"c1\""));
 }
 
-TEST_F(GssNegotiationContextImplTest, TheSpecIsJudgedWithTheFirstLeg) {
+TEST_F(GssNegotiationContextImplTest, TheSpecIsCheckedWithTheFirstLeg) {
   Answer({LegAnswer("c")}, TokenSpec());
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>([&] { context_->Negotiate({7}); }),
             "Token lifetime must be positive");
@@ -154,7 +154,7 @@ TEST_F(GssNegotiationContextImplTest, NegotiateIsTheOneSlot) {
   EXPECT_THAT(transport_->bodies[0], HasSubstr(">Bw==</wst:BinaryExchange>"));
 }
 
-// No static cast leads down from a virtual base.
+// A static cast from a virtual base to a derived class is ill-formed.
 template <class Base, class Derived>
 constexpr bool kCastsDown = requires(Base* base) {
   static_cast<Derived*>(base);
