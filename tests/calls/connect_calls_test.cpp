@@ -32,7 +32,7 @@ class ConnectCallsTest : public testing::Test {
   Tarnik::Ref<FakeSslContext> sslContext_ = Tarnik::MakeRef<FakeSslContext>();
 };
 
-TEST_F(ConnectCallsTest, APlainSpecHandsOnItsSocketAsTheStream) {
+TEST_F(ConnectCallsTest, APlainSpecPassesItsSocketAsTheStream) {
   for (const bool flag : {false, true}) {
     ForgetCalls();
     const auto spec = Tarnik::MakeRef<SsoCustomConnectionSpecImpl>("sts.example", 8443, flag);
@@ -74,7 +74,7 @@ TEST_F(ConnectCallsTest, TheItemHoldsTheSocketThatItCloses) {
   }
 }
 
-TEST_F(ConnectCallsTest, ATlsSpecLendsItsContextToTheConnectUnderWay) {
+TEST_F(ConnectCallsTest, ATlsSpecSharesItsContextWithThePendingConnect) {
   const auto spec = TlsSpec();
   EXPECT_EQ(sslContext_->RefCount(), 2);
   spec->StartConnect([](Stream*, Tarnik::Exception*) {});
@@ -84,7 +84,7 @@ TEST_F(ConnectCallsTest, ATlsSpecLendsItsContextToTheConnectUnderWay) {
   EXPECT_EQ(sslContext_->RefCount(), 2);
 }
 
-TEST_F(ConnectCallsTest, AFailedConnectOfATlsSpecIsHandedOnAtOnce) {
+TEST_F(ConnectCallsTest, AFailedConnectOfATlsSpecIsReportedAtOnce) {
   Stream* stream = nullptr;
   Tarnik::Exception* failure = nullptr;
   TlsSpec()->StartConnect([&](Stream* connected, Tarnik::Exception* error) {

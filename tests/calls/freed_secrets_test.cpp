@@ -8,6 +8,7 @@
 #include <ssoclient/exceptions.h>
 #include <ssoclient/negotiation_handler.h>
 #include <tarnik/text/string_util.h>
+#include <boost/none.hpp>
 
 #include "calls/freed_memory.h"
 #include "sts/answers.h"

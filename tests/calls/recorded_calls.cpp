@@ -9,7 +9,6 @@
 #include <tarnik/core/writer.h>
 #include <tarnik/http/connection_spec.h>
 #include <tarnik/http/http_request.h>
-#include <tarnik/http/http_user_agent.h>
 #include <tarnik/ssl/ssl_context.h>
 #include <tarnik/system/date_time.h>
 

@@ -6,8 +6,6 @@
 
 #include <gmock/gmock.h>
 #include <ssoclient/gss_negotiation_context.h>
-#include <ssoclient/saml_token.h>
-#include <ssoclient/saml_token_factory.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/security_token_service_config.h>
 #include <ssoclient/token_spec.h>
@@ -17,9 +15,9 @@
 #include <tarnik/core/ref.h>
 #include <tarnik/http/http_user_agent.h>
 #include <tarnik/ssl/ssl_context.h>
-#include <tarnik/xml/element_node.h>
 
 #include "calls/recorded_calls.h"
+#include "sts/fakes.h"
 #include "transport/fake_ssl.h"
 #include "transport/read_all.h"
 
@@ -87,7 +85,7 @@ TEST_F(TransportCallsTest, SessionsOfASharedAgentMakeNothing) {
   EXPECT_THAT(Recorded().log, IsEmpty());
 }
 
-TEST_F(TransportCallsTest, ARequestGetsItsHeadersAndThenItsBodyInOneWrite) {
+TEST_F(TransportCallsTest, ARequestHasItsHeadersAndThenItsBodyInOneWrite) {
   const HttpsClient client(kHttps, sslContext_.get(), "", kTimeout, false);
   SoapRequest request;
   request.action = "urn:action";
@@ -119,26 +117,10 @@ TokenSpec OneMinute() {
   return spec;
 }
 
-class AnyTokenFactory final : public SamlTokenFactory {
- public:
-  std::shared_ptr<const SamlToken> CreateToken(const std::string&) const override {
-    return nullptr;
-  }
-  std::shared_ptr<const SamlToken> CreateToken(const std::string&, long) const override {
-    return nullptr;
-  }
-  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
-    return nullptr;
-  }
-  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*, long) const override {
-    return nullptr;
-  }
-};
-
 SecurityTokenServiceConfig ConfigWith(Tarnik::Ssl::SSLContext* sslContext, bool flag) {
   SecurityTokenServiceConfig config;
   config.url = kHttps;
-  config.tokenFactory = std::make_shared<AnyTokenFactory>();
+  config.tokenFactory = std::make_shared<FakeTokenFactory>();
   config.sslContext = sslContext;
   config.sslPeerName = "peer";
   config.flag = flag;
@@ -148,7 +130,7 @@ SecurityTokenServiceConfig ConfigWith(Tarnik::Ssl::SSLContext* sslContext, bool 
 // The fake agents return nothing that the operations understand; only the time that they wait
 // matters.
 
-TEST_F(TransportCallsTest, AServiceGivesEachExchange240SecondsAndHandsItsFlagOn) {
+TEST_F(TransportCallsTest, AServiceGivesEachExchange240SecondsAndPassesItsFlagOn) {
   for (const bool flag : {false, true}) {
     ForgetCalls();
     const auto service = CreateSecurityTokenService(ConfigWith(sslContext_.get(), flag));

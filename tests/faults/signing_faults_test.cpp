@@ -103,7 +103,7 @@ class SigningFaultsTest : public testing::Test {
   Ref<Signature> signature_;
 };
 
-TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenMemoryIsOut) {
+TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenMemoryRunsOut) {
   EXPECT_GT(FailEachCall(FaultKind::kAllocation, 0, Outcome::kOutOfMemory), 10U);
 }
 

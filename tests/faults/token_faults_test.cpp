@@ -54,7 +54,7 @@ class TokenFaultsTest : public testing::Test {
   const Tarnik::Ref<const KeyInfoResolver> resolver_ = TrustedResolver();
 };
 
-TEST_F(TokenFaultsTest, GoodTokenIsReadOrMemoryIsOut) {
+TEST_F(TokenFaultsTest, GoodTokenIsReadOrMemoryRunsOut) {
   std::size_t failures = 0;
   for (bool happened = true; happened;) {
     Verdict verdict;
@@ -69,7 +69,7 @@ TEST_F(TokenFaultsTest, GoodTokenIsReadOrMemoryIsOut) {
   EXPECT_GT(failures, 50U);
 }
 
-TEST_F(TokenFaultsTest, ForgedTokenIsNeverAcceptedWhenMemoryIsOut) {
+TEST_F(TokenFaultsTest, ForgedTokenIsNeverAcceptedWhenMemoryRunsOut) {
   for (const Forgery& forgery : Forgeries()) {
     std::size_t failures = 0;
     for (bool happened = true; happened; ++failures) {

@@ -31,11 +31,6 @@ class AcquireByTokenTest : public HolderOfKeyTest {
     spec.actAsToken = std::move(token);
     return spec;
   }
-  static std::shared_ptr<const SamlToken> DelegableBearer() {
-    TokenSpec spec = Bearer();
-    spec.delegable = true;
-    return Acquire(spec);
-  }
   static std::shared_ptr<const SamlToken> MachineToken() {
     return HolderService()->AcquireTokenByCertificate(RenewableAndDelegable());
   }
@@ -50,7 +45,7 @@ TEST_F(AcquireByTokenTest, GivesANewTokenOfTheSameSubjectAndKey) {
   EXPECT_THAT(ChainOf(*second), IsEmpty());
 }
 
-TEST_F(AcquireByTokenTest, GivesABearerTokenIfAskedFor) {
+TEST_F(AcquireByTokenTest, GivesABearerTokenIfRequested) {
   const auto token = ByToken(*AcquireBound(), Bearer());
   EXPECT_EQ(token->Subject().name, "alice");
   EXPECT_EQ(token->ConfirmationType(), BEARER);
@@ -104,7 +99,7 @@ TEST_F(AcquireByTokenTest, ActsForTheSubjectOfABearerToken) {
   EXPECT_TRUE(IsBoundTo(*token, Holder()));
 }
 
-TEST_F(AcquireByTokenTest, ActsForTheSubjectAndHandsItOn) {
+TEST_F(AcquireByTokenTest, ActsForTheSubjectAndDelegates) {
   TokenSpec spec = OnBehalfOf(DelegableBearer());
   spec.delegateTo = std::string("bob@EXAMPLE.COM");
   const auto token = ByToken(*MachineToken(), spec);
@@ -118,7 +113,7 @@ TEST_F(AcquireByTokenTest, ADelegateActsWithoutAppearingInTheChainTwice) {
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine"));
 }
 
-TEST_F(AcquireByTokenTest, ABoundTokenIsActedForAsWell) {
+TEST_F(AcquireByTokenTest, AHolderOfKeyTokenMayBeTheActAsToken) {
   const auto token = ByToken(*MachineToken(), OnBehalfOf(AcquireBound()));
   EXPECT_EQ(token->Subject().name, "alice");
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine"));

@@ -21,6 +21,7 @@
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 
 namespace SsoClient::Testing {
 namespace {
@@ -79,7 +80,7 @@ TEST_P(EveryOperationAsyncTest, ServiceMayBeReleasedBeforeTheCallEnds) {
   ExpectSuccess(Await(future));
 }
 
-TEST_P(EveryOperationAsyncTest, SpecIsCopiedAndOnlyTheTokenStaysTheCallers) {
+TEST_P(EveryOperationAsyncTest, SpecIsCopiedButNotTheToken) {
   const auto service = HolderService();
   Arguments arguments = WithToken();
   DevSts::Misbehavior slow;
@@ -131,18 +132,9 @@ struct Trouble {
   bool concernsRenewal = true;
 };
 
-void Replace(std::string& text, const std::string& what, const std::string& by) {
-  const auto at = text.find(what);
-  if (at == std::string::npos) {
-    throw std::runtime_error("nothing to replace: " + what);
-  }
-  text.replace(at, what.size(), by);
-}
-
 void AnswerFault(DevSts::Server& server, const char* code, const char* text) {
   DevSts::Misbehavior misbehavior;
-  misbehavior.fault = DevSts::FaultAnswer{"http://docs.oasis-open.org/ws-sx/ws-trust/200512", code,
-                                          text, false, 500};
+  misbehavior.fault = DevSts::FaultAnswer{kTrust, code, text, false, 500};
   server.SetMisbehavior(misbehavior);
 }
 

@@ -151,7 +151,7 @@ TEST_P(OutOfPeriodTest, FailsEverySignatureAndSendsNothing) {
   EXPECT_THAT(Sts().Requests(), IsEmpty());
 }
 
-TEST_P(OutOfPeriodTest, DoesNotHinderWhatIsNotSigned) {
+TEST_P(OutOfPeriodTest, DoesNotAffectUnsignedRequests) {
   EXPECT_EQ(CallNow(Operation::Validate, *service_, arguments_).verdict, true);
   arguments_.spec.confirmation = CONFIRMATION_BEARER;
   const Outcome outcome = CallNow(Operation::Password, *service_, arguments_);

@@ -3,7 +3,6 @@
 #include <memory>
 #include <optional>
 #include <string>
-#include <string_view>
 #include <typeindex>
 #include <typeinfo>
 #include <utility>
@@ -13,6 +12,7 @@
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 
 namespace SsoClient::Testing {
 namespace {
@@ -51,7 +51,7 @@ class HolderOfKeyFaultTest : public HolderOfKeyTest {
   }
 };
 
-TEST_F(HolderOfKeyFaultTest, UnknownCertificateIsNobodys) {
+TEST_F(HolderOfKeyFaultTest, UnknownCertificateIsRefused) {
   ExpectRejected(CallNow(Operation::Certificate, *HolderService(Stranger()), {}),
                  "The certificate is nobody's");
 }
@@ -112,9 +112,7 @@ TEST_P(PresentedTokenFaultTest, TokenThatTheServiceForgotIsRefused) {
 
 TEST_P(PresentedTokenFaultTest, TokenThatAStrangerSignedIsRefused) {
   std::string xml = AcquireBound()->Xml();
-  constexpr std::string_view kEnd = "</ds:Signature>";
-  const auto from = xml.find("<ds:Signature ");
-  xml.erase(from, xml.find(kEnd) + kEnd.size() - from);
+  EraseSignature(xml);
   const DevSts::Credential stranger = Sts().StrangerCredential();
   xml = DevSts::SignXml(xml, stranger.privateKeyPem, stranger.certificatePem,
                         DevSts::AssertionOptions::DefaultSigning());
@@ -216,10 +214,6 @@ struct FaultCase {
   std::type_index errorClass;
   const char* message;
 };
-
-constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
-constexpr char kSecext[] =
-    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
 
 class AnyFaultTest : public HolderOfKeyFaultTest, public testing::WithParamInterface<FaultCase> {};
 

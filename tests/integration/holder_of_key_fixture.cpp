@@ -54,13 +54,7 @@ DevSts::Credential HolderValidBetween(std::chrono::seconds notBefore,
 std::shared_ptr<SecurityTokenService> MakeHolderService(const DevSts::Server& server,
                                                         const std::string& url,
                                                         const DevSts::Credential& credential) {
-  const auto sslContext = TrustCa(server);
-  SecurityTokenServiceConfig config;
-  config.url = url;
-  config.sslContext = sslContext.get();
-  config.tokenFactory = CreateSamlTokenFactory(TrustSigner(server.SigningCertificatePem()).get());
-  config.holderOfKeyConfig = ConfigOf(credential);
-  return CreateSecurityTokenService(config);
+  return MakeService(server, url, ConfigOf(credential));
 }
 
 TokenSpec RenewableAndDelegable() {

@@ -58,6 +58,12 @@ class HolderOfKeyTest : public StsTest {
       const TokenSpec& spec = RenewableAndDelegable()) {
     return HolderService()->AcquireToken(kUser, kPassword, spec);
   }
+  /// A bearer token of `kUser` that may be delegated.
+  static std::shared_ptr<const SamlToken> DelegableBearer() {
+    TokenSpec spec = Bearer();
+    spec.delegable = true;
+    return Acquire(spec);
+  }
 };
 
 }  // namespace SsoClient::Testing

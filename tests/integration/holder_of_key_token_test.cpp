@@ -49,7 +49,7 @@ TEST_F(HolderOfKeyTokenTest, ByPasswordTheSpecReachesTheToken) {
   EXPECT_THAT(advice[0].attributes[0].values, ElementsAre("one", "two"));
 }
 
-TEST_F(HolderOfKeyTokenTest, ByPasswordIsABearerTokenIfAskedFor) {
+TEST_F(HolderOfKeyTokenTest, ByPasswordIsABearerTokenIfRequested) {
   const auto token = AcquireBound(Bearer());
   EXPECT_EQ(token->Subject().name, "alice");
   EXPECT_EQ(token->ConfirmationType(), BEARER);

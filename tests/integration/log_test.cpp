@@ -6,6 +6,7 @@
 #include <tarnik/service/log.h>
 
 #include "integration/sts_fixture.h"
+#include "integration/text_edits.h"
 
 namespace SsoClient::Testing {
 namespace {
@@ -93,17 +94,6 @@ TEST_F(LogTest, NoPasswordOrTokenTextInAnyLine) {
     EXPECT_THAT(line.text, Not(HasSubstr(token->Id())));
     EXPECT_THAT(line.text, Not(HasSubstr("SignatureValue")));
   }
-}
-
-void Replace(std::string& text, const std::string& what, const std::string& with) {
-  const auto at = text.find(what);
-  ASSERT_NE(at, std::string::npos) << what;
-  text.replace(at, what.size(), with);
-}
-
-std::string Between(const std::string& text, const std::string& start, const std::string& end) {
-  const auto from = text.find(start) + start.size();
-  return text.substr(from, text.find(end, from) - from);
 }
 
 TEST_F(LogTest, NoTokenTextInTheFailureOrTheLinesOfARefusedAnswer) {

@@ -1,7 +1,6 @@
 // What each operation writes to the log, and what never appears there.
 #include <cstddef>
 #include <functional>
-#include <stdexcept>
 #include <string>
 #include <tuple>
 #include <utility>
@@ -11,6 +10,7 @@
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 #include "sts/log_capture.h"
 
 namespace SsoClient::Testing {
@@ -96,8 +96,7 @@ TEST_P(OperationLogTest, LevelsFiveAndSixLogOnlyAnAcquiredToken) {
 
 TEST_P(OperationLogTest, FailureOfTheServiceStillWritesTheEndLine) {
   DevSts::Misbehavior misbehavior;
-  misbehavior.fault = DevSts::FaultAnswer{"http://docs.oasis-open.org/ws-sx/ws-trust/200512",
-                                          "RequestFailed", "no", false, 500};
+  misbehavior.fault = DevSts::FaultAnswer{kTrust, "RequestFailed", "no", false, 500};
   Sts().SetMisbehavior(misbehavior);
   const auto service = HolderService();
   const LogCapture log(9);
@@ -146,15 +145,6 @@ TEST_P(OperationLogTest, ByDefaultSuccessAndFailureAreSilent) {
   arguments_.password = "wrong-secret";
   CallNow(GetParam(), *service, arguments_);
   EXPECT_THAT(log.Lines(), IsEmpty());
-}
-
-std::string Between(const std::string& text, const std::string& start, const std::string& end) {
-  const auto from = text.find(start);
-  if (from == std::string::npos) {
-    throw std::runtime_error("not found: " + start);
-  }
-  const auto begin = from + start.size();
-  return text.substr(begin, text.find(end, begin) - begin);
 }
 
 /// Pieces of everything that must stay secret: the password, the private key and the text of every

@@ -14,10 +14,6 @@ namespace {
 using testing::HasSubstr;
 using testing::StartsWith;
 
-constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
-constexpr char kSecext[] =
-    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
-
 class RefusalTest : public StsTest {
  protected:
   static std::string CommunicationFailure() {

@@ -30,7 +30,7 @@ class RenewTokenTest : public HolderOfKeyTest {
   }
 };
 
-TEST_F(RenewTokenTest, GivesANewTokenForTheLifetimeThatIsAskedFor) {
+TEST_F(RenewTokenTest, GivesANewTokenForTheRequestedLifetime) {
   const auto token = AcquireBound();
   const auto renewed = Renew(*token, 7200);
   EXPECT_NE(renewed->Id(), token->Id());
@@ -40,7 +40,7 @@ TEST_F(RenewTokenTest, GivesANewTokenForTheLifetimeThatIsAskedFor) {
   EXPECT_EQ(lifetime, 7200L * 1'000'000);
 }
 
-TEST_F(RenewTokenTest, KeepsWhatTheTokenSays) {
+TEST_F(RenewTokenTest, KeepsTheContentOfTheToken) {
   TokenSpec spec = RenewableAndDelegable();
   spec.audienceRestriction = {"https://a.example"};
   spec.advice = {{"urn:source", {{"urn:attribute", {"value"}}}}};
@@ -61,7 +61,7 @@ TEST_F(RenewTokenTest, KeepsWhatTheTokenSays) {
   EXPECT_FALSE(after.empty());
 }
 
-TEST_F(RenewTokenTest, CountsDownUntilTheTokenMayNotBeRenewedAnyMore) {
+TEST_F(RenewTokenTest, CountsDownUntilTheTokenIsNoLongerRenewable) {
   DevSts::AssertionOptions options;
   options.renewCount = 3;
   Sts().SetAssertionOptions(options);

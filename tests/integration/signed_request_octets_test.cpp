@@ -1,8 +1,8 @@
 // Signed requests as they arrive, verified by another implementation of XML signatures.
 #include <memory>
 #include <set>
-#include <stdexcept>
 #include <string>
+#include <string_view>
 #include <tuple>
 #include <vector>
 
@@ -11,6 +11,7 @@
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 #include "integration/wire_request.h"
 
 namespace SsoClient::Testing {
@@ -98,12 +99,9 @@ void ExpectVerifies(const std::string& body) {
   EXPECT_FALSE(DevSts::VerifyXml(body, Stranger().certificatePem));
 }
 
-std::string Changed(std::string text, const std::string& what, const std::string& by) {
-  const auto at = text.find(what);
-  if (at == std::string::npos) {
-    throw std::runtime_error("nothing to change: " + what);
-  }
-  return text.replace(at, what.size(), by);
+std::string Changed(std::string text, std::string_view what, std::string_view by) {
+  Replace(text, what, by);
+  return text;
 }
 
 TEST_P(SignedTextTest, ArrivesUnchangedUnderASignatureThatVerifies) {

@@ -9,11 +9,18 @@
 #include <gtest/gtest.h>
 #include <ssoclient/ssoclient.h>
 #include <tarnik/crypto/certificate.h>
+#include <boost/none.hpp>
+#include <boost/optional.hpp>
 
 namespace SsoClient::Testing {
 
 inline constexpr char kUser[] = "alice@EXAMPLE.COM";
 inline constexpr char kPassword[] = "secret";
+
+/// The namespaces of the fault codes of WS-Trust and WS-Security.
+inline constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
+inline constexpr char kSecext[] =
+    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
 
 /// TLS trust in the CA of `server`.
 Tarnik::Ref<Tarnik::Ssl::SSLContext> TrustCa(const DevSts::Server& server);
@@ -22,8 +29,9 @@ Tarnik::Ref<Tarnik::Ssl::SSLContext> TrustCa(const DevSts::Server& server);
 Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> TrustSigner(const std::string& pem);
 
 /// A service for `url` that trusts `server`'s CA and signing key.
-std::shared_ptr<SecurityTokenService> MakeService(const DevSts::Server& server,
-                                                  const std::string& url);
+std::shared_ptr<SecurityTokenService> MakeService(
+    const DevSts::Server& server, const std::string& url,
+    const boost::optional<HolderOfKeyConfig>& holderOfKeyConfig = boost::none);
 
 /// A spec for ten minutes that requests nothing else.
 TokenSpec TenMinutes();

@@ -8,6 +8,7 @@
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 #include "integration/wire_request.h"
 #include "support/parse_xml.h"
 
@@ -26,11 +27,6 @@ class TravellingTokenShapesTest : public HolderOfKeyTest,
     DevSts::AssertionOptions options;
     GetParam().change(options);
     Sts().SetAssertionOptions(options);
-  }
-  static std::shared_ptr<const SamlToken> DelegableBearer() {
-    TokenSpec spec = Bearer();
-    spec.delegable = true;
-    return Acquire(spec);
   }
 };
 
@@ -118,14 +114,9 @@ TEST_F(KeptTokenTest, OfAFileWithDeclarationMarkAndCommentsIsAccepted) {
 
 TEST_F(KeptTokenTest, WrittenInAnotherWayIsAccepted) {
   std::string xml = AcquireBound()->Xml();
-  const auto replace = [&xml](const std::string& what, const std::string& by) {
-    const auto at = xml.find(what);
-    ASSERT_NE(at, std::string::npos) << what;
-    xml.replace(at, what.size(), by);
-  };
-  replace(">alice@EXAMPLE.COM<", "><![CDATA[alice]]>&#64;EXAMPLE.COM<");
-  replace("Version=\"2.0\"", "Version='2.0'");
-  replace("<saml2:Subject>", "<saml2:Subject  >");
+  Replace(xml, ">alice@EXAMPLE.COM<", "><![CDATA[alice]]>&#64;EXAMPLE.COM<");
+  Replace(xml, "Version=\"2.0\"", "Version='2.0'");
+  Replace(xml, "<saml2:Subject>", "<saml2:Subject  >");
   ExpectAccepted(CreateSamlToken(xml));
 }
 

@@ -6,6 +6,7 @@
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
+#include "integration/text_edits.h"
 #include "integration/wire_request.h"
 
 namespace SsoClient::Testing {
@@ -56,9 +57,7 @@ TEST_F(ValidateSubjectTest, TokenOfAnotherServiceIsNotValid) {
 
 TEST_F(ValidateSubjectTest, ForgedTokenIsNotValid) {
   std::string xml = AcquireBound()->Xml();
-  const auto at = xml.find(">alice@");
-  ASSERT_NE(at, std::string::npos);
-  xml.replace(at, 7, ">carol@");
+  Replace(xml, ">alice@", ">carol@");
   EXPECT_FALSE(IsValid(*CreateSamlToken(xml)));
 }
 

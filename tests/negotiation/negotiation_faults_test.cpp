@@ -12,15 +12,8 @@
 namespace SsoClient::Testing {
 namespace {
 
-using testing::Contains;
 using testing::HasSubstr;
 using testing::IsEmpty;
-
-DevSts::NegotiationScript TwoLegs() {
-  DevSts::NegotiationScript script;
-  script.requestMic = true;
-  return script;
-}
 
 const DevSts::NegotiationScript kOneLeg;
 
@@ -107,7 +100,7 @@ TEST_F(NegotiationFaultsTest, ALateFailureIsTheServicesFault) {
               HasSubstr("The negotiation was told to fail"));
 }
 
-TEST_F(NegotiationFaultsTest, AServiceThatDemandsACookieThatItNeverSetRefuses) {
+TEST_F(NegotiationFaultsTest, AServiceThatRequiresACookieItNeverSetRefuses) {
   DevSts::LegMisbehavior leg;
   leg.omitCookie = true;
   MisbehaveOnce(leg);

@@ -13,12 +13,6 @@
 namespace SsoClient::Testing {
 namespace {
 
-DevSts::NegotiationScript TwoLegs() {
-  DevSts::NegotiationScript script;
-  script.requestMic = true;
-  return script;
-}
-
 class NegotiationThreadsTest : public RealmTest {
  protected:
   NegotiationThreadsTest() { Sts().SetNegotiationScript(TwoLegs()); }

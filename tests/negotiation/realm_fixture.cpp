@@ -44,6 +44,12 @@ const auto* const registered = testing::AddGlobalTestEnvironment(environment);
 
 }  // namespace
 
+DevSts::NegotiationScript TwoLegs() {
+  DevSts::NegotiationScript script;
+  script.requestMic = true;
+  return script;
+}
+
 RealmTest::RealmTest() {
   Sts().ClearMisbehavior();
   Sts().SetNegotiationScript({});

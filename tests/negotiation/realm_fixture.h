@@ -18,6 +18,9 @@ namespace SsoClient::Testing {
 /// The dev STS's name in the realm.
 inline constexpr char kTarget[] = "HTTP@sts.example";
 
+/// A negotiation of two legs.
+DevSts::NegotiationScript TwoLegs();
+
 /// One Kerberos realm for all tests of the process, which belongs to it, and one dev STS with a key
 /// of that realm, well-behaved at the start of each test. In the realm, "alice" has a password,
 /// "machine" has a keytab, and "nobody" has a password but no account at the STS.

@@ -1,11 +1,12 @@
 #include "support/secret_text.h"
 
-#include <algorithm>
 #include <array>
 #include <new>
 #include <string>
 
 #include <gtest/gtest.h>
+
+#include "support/holds_text.h"
 
 namespace SsoClient::Testing {
 namespace {
@@ -16,13 +17,9 @@ TEST(SecretTextTest, CleansesItsTextWhenItIsDestroyed) {
   alignas(SecretText) std::array<unsigned char, sizeof(SecretText)> storage{};
   auto* text = new (storage.data()) SecretText(secret);
   EXPECT_EQ(text->text, secret);
-  const auto holdsSecret = [&] {
-    return std::search(storage.begin(), storage.end(), secret.begin(), secret.end()) !=
-           storage.end();
-  };
-  EXPECT_TRUE(holdsSecret());
+  EXPECT_TRUE(HoldsText(storage, secret));
   text->~SecretText();
-  EXPECT_FALSE(holdsSecret());
+  EXPECT_FALSE(HoldsText(storage, secret));
 }
 
 }  // namespace

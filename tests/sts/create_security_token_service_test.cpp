@@ -3,8 +3,6 @@
 
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
-#include <ssoclient/saml_token.h>
-#include <ssoclient/saml_token_factory.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/security_token_service_config.h>
 #include <tarnik/core/exception.h>
@@ -12,12 +10,11 @@
 #include <tarnik/core/ref.h>
 #include <tarnik/http/connection_spec.h>
 #include <tarnik/http/http_user_agent.h>
-#include <tarnik/xml/element_node.h>
 
 #include "sts/answers.h"
+#include "sts/fakes.h"
 #include "sts/token_specs.h"
 #include "support/assertion_text.h"
-#include "support/fake_saml_token.h"
 #include "support/holder_of_key.h"
 #include "support/thrown_message.h"
 #include "transport/fake_http.h"
@@ -30,22 +27,6 @@ namespace {
 
 using testing::HasSubstr;
 using testing::StartsWith;
-
-class AcceptingFactory final : public SamlTokenFactory {
- public:
-  std::shared_ptr<const SamlToken> CreateToken(const std::string& xml) const override {
-    return CreateToken(xml, 600);
-  }
-  std::shared_ptr<const SamlToken> CreateToken(const std::string& xml, long) const override {
-    return std::make_shared<FakeSamlToken>(xml);
-  }
-  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
-    return nullptr;
-  }
-  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*, long) const override {
-    return nullptr;
-  }
-};
 
 template <class Config>
 std::string ArgumentError(const Config& config) {
@@ -69,7 +50,7 @@ class CreateSecurityTokenServiceTest : public testing::Test {
  protected:
   CreateSecurityTokenServiceTest() {
     config_.url = server_.Url("/sts/STSService");
-    config_.tokenFactory = std::make_shared<AcceptingFactory>();
+    config_.tokenFactory = std::make_shared<FakeTokenFactory>();
   }
 
   LoopbackServer server_{[](const std::string&) { return OkAnswer(IssueAnswer()); }};
@@ -124,7 +105,7 @@ TEST_F(CreateSecurityTokenServiceTest, HttpsNeedsAnSslContext) {
   EXPECT_EQ(ArgumentError(config_), "HTTPS connection requested but no SSLContext provided.");
 }
 
-TEST_F(CreateSecurityTokenServiceTest, HandsTheTlsValuesOn) {
+TEST_F(CreateSecurityTokenServiceTest, PassesTheTlsValuesOn) {
   const auto context = Tarnik::MakeRef<FakeSslContext>();
   config_.url = "https://127.0.0.1:" + std::to_string(server_.Port()) + "/";
   config_.sslContext = context.get();
@@ -148,7 +129,7 @@ class CreateSecurityTokenServiceExTest : public CreateSecurityTokenServiceTest {
  protected:
   CreateSecurityTokenServiceExTest() {
     agent_->onWait = [] { return Tarnik::MakeRef<FakeResponse>(200, "OK", IssueAnswer()); };
-    configEx_.url = "/used/as/it/stands";
+    configEx_.url = "/used/unchanged";
     configEx_.userAgent = agent_;
     configEx_.tokenFactory = config_.tokenFactory;
   }

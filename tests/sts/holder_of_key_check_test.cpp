@@ -15,6 +15,7 @@
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/system/date_time.h>
+#include <boost/none.hpp>
 
 #include "support/holder_of_key.h"
 #include "support/thrown_message.h"

@@ -9,6 +9,7 @@
 #include <ssoclient/exceptions.h>
 #include <ssoclient/negotiation_handler.h>
 #include <tarnik/text/string_util.h>
+#include <boost/none.hpp>
 
 #include "sts/answers.h"
 #include "sts/fakes.h"

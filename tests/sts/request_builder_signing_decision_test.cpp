@@ -7,7 +7,7 @@
 #include <gtest/gtest.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
-#include <tarnik/xml/xml_parse_exception.h>
+#include <boost/none.hpp>
 
 #include "sts/request_operations.h"
 #include "support/thrown_message.h"

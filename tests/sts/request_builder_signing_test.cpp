@@ -15,6 +15,7 @@
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/element_node.h>
 #include <tarnik/xml/xml_parse_exception.h>
+#include <boost/none.hpp>
 
 #include "sts/request_operations.h"
 #include "support/fake_saml_token.h"
@@ -179,7 +180,7 @@ constexpr char kUtility[] =
     "oasis-200401-wss-wssecurity-utility-1.0.xsd\"";
 
 // The ids of the signed elements are new for each request.
-TEST(RequestSigningTokenTest, IdsInsideOfTokensDoNotDivertTheSignature) {
+TEST(RequestSigningTokenTest, IdsInTokensDoNotDivertTheSignature) {
   for (const std::string& attributes :
        {std::string("u:Id=\"Body\"") + kUtility, std::string("id=\"Timestamp\"")}) {
     SoapRequest request;

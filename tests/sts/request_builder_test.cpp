@@ -11,6 +11,7 @@
 #include <gmock/gmock.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
+#include <boost/none.hpp>
 
 #include "sts/request_operations.h"
 #include "support/fake_saml_token.h"

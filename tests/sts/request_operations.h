@@ -25,12 +25,14 @@ inline constexpr char kValidateAction[] =
 
 inline constexpr char kNoKeyForRenewal[] = "No HolderOfKeyConfig provided. Unable to renew token";
 
+/// The children of wsse:Security.
 inline constexpr char kTimestamp[] = "wsu:Timestamp";
 inline constexpr char kUsername[] = "wsse:UsernameToken";
 inline constexpr char kCertificate[] = "wsse:BinarySecurityToken";
 inline constexpr char kAssertion[] = "Assertion";
 inline constexpr char kSignature[] = "ds:Signature";
 
+/// The key and certificate of `BuilderWithKey()`.
 inline const DevSts::Credential& Credential() {
   static const DevSts::Credential credential = KeyCredential();
   return credential;
@@ -58,6 +60,8 @@ inline TokenSpec SpecOf(std::int64_t seconds, ConfirmationType confirmation = CO
   return spec;
 }
 
+/// An operation of a builder. Each takes its lifetime and confirmation from the spec, if it has
+/// any, and `PresentedToken()` where it needs a token.
 using BuildOperation =
     std::function<void(const RequestBuilderImpl&, const TokenSpec&, SoapRequest&)>;
 
@@ -65,29 +69,36 @@ inline void ByPassword(const RequestBuilderImpl& builder, const TokenSpec& spec,
                        SoapRequest& request) {
   builder.BuildAcquireTokenRequest("alice", "pw", spec, request);
 }
+
 inline void InitialLeg(const RequestBuilderImpl& builder, const TokenSpec& spec,
                        SoapRequest& request) {
   builder.BuildInitialNegotiationRequest(spec, {1}, request);
 }
+
 inline void ContinuedLeg(const RequestBuilderImpl& builder, const TokenSpec&,
                          SoapRequest& request) {
   builder.BuildContinuedNegotiationRequest("c", {1}, request);
 }
+
 inline void ByCertificate(const RequestBuilderImpl& builder, const TokenSpec& spec,
                           SoapRequest& request) {
   builder.BuildAcquireTokenByCertificateRequest(spec, request);
 }
+
 inline void ByToken(const RequestBuilderImpl& builder, const TokenSpec& spec,
                     SoapRequest& request) {
   builder.BuildAcquireTokenByTokenRequest(PresentedToken(), spec, request);
 }
+
 inline void Validate(const RequestBuilderImpl& builder, const TokenSpec&, SoapRequest& request) {
   builder.BuildValidateRequest(PresentedToken(), request);
 }
+
 inline void Renew(const RequestBuilderImpl& builder, const TokenSpec& spec, SoapRequest& request) {
   builder.BuildRenewRequest(PresentedToken(), spec.tokenLifetimeSec, request);
 }
 
+/// The qualified names of the children of wsse:Security.
 inline std::vector<std::string> HeaderOf(const std::string& envelope) {
   const auto document = ParseXml(envelope);
   const auto* security =

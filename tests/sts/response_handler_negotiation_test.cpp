@@ -4,7 +4,6 @@
 
 #include <gmock/gmock.h>
 #include <tarnik/core/reader.h>
-#include <tarnik/xml/xml_parse_exception.h>
 
 #include "sts/answers.h"
 #include "sts/parse_answers.h"

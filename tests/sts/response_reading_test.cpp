@@ -13,7 +13,7 @@
 namespace SsoClient::Testing {
 namespace {
 
-TEST(ResponseElementsTest, ElementTextIsThatOfAFirstTextChild) {
+TEST(ResponseElementsTest, ElementTextIsTheTextOfAFirstTextChild) {
   const struct {
     const char* xml;
     const char* text;

@@ -16,14 +16,12 @@
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
+#include <boost/optional.hpp>
 
 #include "describe/describe.h"
 #include "sts/answers.h"
-#include "sts/fakes.h"
+#include "sts/fake_sts.h"
 #include "sts/log_capture.h"
-#include "sts/request_builder.h"
-#include "sts/response_handler.h"
-#include "sts/security_token_service_impl.h"
 #include "sts/token_specs.h"
 #include "support/async_call.h"
 #include "support/fake_saml_token.h"
@@ -51,19 +49,9 @@ FakeSamlToken Presented() {
   return token;
 }
 
-class Sts {
- public:
-  explicit Sts(const std::string& answer) : transport(std::make_shared<FakeTransport>(answer)) {}
-
-  std::shared_ptr<const SecurityTokenService> Service() const {
-    return std::make_shared<SecurityTokenServiceImpl>(
-        std::make_shared<RequestBuilderImpl>(ConfigOf(KeyCredential())), transport,
-        std::make_shared<ResponseHandlerImpl>(), factory);
-  }
-
-  std::shared_ptr<FakeTransport> transport;
-  std::shared_ptr<FakeTokenFactory> factory = std::make_shared<FakeTokenFactory>();
-};
+FakeSts StsWithKey(const std::string& answer) {
+  return FakeSts({answer}, ConfigOf(KeyCredential()));
+}
 
 std::string Start(const std::string& name) {
   return "7 START operation SecurityTokenServiceImpl::" + name;
@@ -78,7 +66,7 @@ std::string Success(const SamlToken& token) {
 }
 
 TEST(HolderOfKeyOperationsTest, ByCertificateIsTraced) {
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   const LogCapture log(7);
   const auto token = sts.Service()->AcquireTokenByCertificate(OneHour());
   ASSERT_NE(token, nullptr);
@@ -90,7 +78,7 @@ TEST(HolderOfKeyOperationsTest, ByCertificateIsTraced) {
 }
 
 TEST(HolderOfKeyOperationsTest, ByTokenIsTraced) {
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   const LogCapture log(7);
   const auto presented = Presented();
   const auto token = sts.Service()->AcquireTokenByToken(presented, OneHour());
@@ -105,7 +93,7 @@ TEST(HolderOfKeyOperationsTest, ByTokenIsTraced) {
 }
 
 TEST(HolderOfKeyOperationsTest, RenewalIsTraced) {
-  const Sts sts(RenewAnswer());
+  const FakeSts sts = StsWithKey(RenewAnswer());
   const LogCapture log(7);
   const auto presented = Presented();
   const auto token = sts.Service()->RenewToken(presented, 90);
@@ -119,7 +107,7 @@ TEST(HolderOfKeyOperationsTest, RenewalIsTraced) {
 
 TEST(HolderOfKeyOperationsTest, ValidationIsTracedAndGivesTheVerdict) {
   for (const bool isValid : {true, false}) {
-    const Sts sts(StatusAnswer(isValid ? "valid" : "invalid"));
+    const FakeSts sts = StsWithKey(StatusAnswer(isValid ? "valid" : "invalid"));
     const LogCapture log(7);
     const auto presented = Presented();
     EXPECT_EQ(sts.Service()->ValidateSubject(presented), isValid);
@@ -133,7 +121,7 @@ TEST(HolderOfKeyOperationsTest, ValidationIsTracedAndGivesTheVerdict) {
 }
 
 TEST(HolderOfKeyOperationsTest, TheEndIsLoggedWhenAnOperationFails) {
-  Sts sts(IssueAnswer());
+  FakeSts sts = StsWithKey(IssueAnswer());
   sts.transport->failure.emplace("broken");
   const auto service = sts.Service();
   const auto presented = Presented();
@@ -151,7 +139,7 @@ TEST(HolderOfKeyOperationsTest, TheEndIsLoggedWhenAnOperationFails) {
 }
 
 TEST(HolderOfKeyOperationsTest, ArgumentErrorsComeBeforeAnythingIsSent) {
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   const auto service = sts.Service();
   auto bearer = Presented();
   bearer.confirmationType = BEARER;
@@ -162,8 +150,8 @@ TEST(HolderOfKeyOperationsTest, ArgumentErrorsComeBeforeAnythingIsSent) {
 }
 
 TEST(HolderOfKeyOperationsAsyncTest, TokensReachTheCallback) {
-  const Sts issuing(IssueAnswer());
-  const Sts renewing(RenewAnswer());
+  const FakeSts issuing = StsWithKey(IssueAnswer());
+  const FakeSts renewing = StsWithKey(RenewAnswer());
   const auto presented = Presented();
   AsyncCall byCertificate;
   AsyncCall byToken;
@@ -180,7 +168,7 @@ TEST(HolderOfKeyOperationsAsyncTest, TokensReachTheCallback) {
 }
 
 TEST(HolderOfKeyOperationsAsyncTest, RequestsEqualTheSynchronousOnes) {
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   const auto service = sts.Service();
   const auto presented = Presented();
   auto spec = OneHour();
@@ -207,7 +195,7 @@ TEST(HolderOfKeyOperationsAsyncTest, RequestsEqualTheSynchronousOnes) {
 TEST(HolderOfKeyOperationsAsyncTest, ThreadsMaySignWithOneServiceThatIsReleasedMeanwhile) {
   constexpr int kThreads = 4;
   constexpr int kRounds = 8;
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   auto service = sts.Service();
   const auto presented = Presented();
   std::array<std::array<AsyncCall, kRounds>, kThreads> calls;
@@ -237,7 +225,7 @@ TEST(HolderOfKeyOperationsAsyncTest, ThreadsMaySignWithOneServiceThatIsReleasedM
 }
 
 TEST(HolderOfKeyOperationsAsyncTest, ErrorsReachTheCallbackWithTheirClass) {
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   auto bearer = Presented();
   bearer.confirmationType = BEARER;
   AsyncCall renewal;
@@ -252,7 +240,7 @@ struct Verdict {
   std::string error;
 };
 
-Verdict ValidateAsync(const Sts& sts) {
+Verdict ValidateAsync(const FakeSts& sts) {
   const auto presented = Presented();
   auto promise = std::make_shared<std::promise<Verdict>>();
   sts.Service()->ValidateSubjectAsync(
@@ -264,17 +252,17 @@ Verdict ValidateAsync(const Sts& sts) {
 
 TEST(HolderOfKeyOperationsAsyncTest, ValidationReportsAVerdictOrNone) {
   for (const bool isValid : {true, false}) {
-    const auto verdict = ValidateAsync(Sts(StatusAnswer(isValid ? "valid" : "invalid")));
+    const auto verdict = ValidateAsync(StsWithKey(StatusAnswer(isValid ? "valid" : "invalid")));
     EXPECT_TRUE(verdict.isValid == isValid);
     EXPECT_EQ(verdict.error, "");
   }
-  const auto verdict = ValidateAsync(Sts("no answer"));
+  const auto verdict = ValidateAsync(StsWithKey("no answer"));
   EXPECT_FALSE(verdict.isValid.has_value());
   EXPECT_EQ(verdict.error, typeid(SsoException).name());
 }
 
 TEST(HolderOfKeyOperationsAsyncTest, EmptyCallbacksAreRefusedAtTheCall) {
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   const auto service = sts.Service();
   const auto presented = Presented();
   EXPECT_THROW(service->AcquireTokenByCertificateAsync(OneHour(), nullptr),
@@ -288,7 +276,7 @@ TEST(HolderOfKeyOperationsAsyncTest, EmptyCallbacksAreRefusedAtTheCall) {
 TEST(HolderOfKeyOperationsTest, OperationsKeepTheirSlotOrder) {
   using Token = std::shared_ptr<const SamlToken>;
   using Callback = SecurityTokenService::TokenCallback;
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   const auto service = sts.Service();
   const SecurityTokenService* object = service.get();
   const auto presented = Presented();
@@ -328,7 +316,7 @@ TEST(HolderOfKeyOperationsTest, OperationsKeepTheirSlotOrder) {
 }
 
 TEST(HolderOfKeyOperationsTest, NothingSecretIsLogged) {
-  const Sts sts(IssueAnswer());
+  const FakeSts sts = StsWithKey(IssueAnswer());
   const LogCapture log(9);
   sts.Service()->AcquireTokenByToken(Presented(), OneHour());
   EXPECT_THAT(log.Lines(), testing::Each(Not(HasSubstr("<Presented"))));

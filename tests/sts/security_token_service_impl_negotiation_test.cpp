@@ -16,11 +16,8 @@
 
 #include "describe/describe.h"
 #include "sts/answers.h"
-#include "sts/fakes.h"
+#include "sts/fake_sts.h"
 #include "sts/log_capture.h"
-#include "sts/request_builder.h"
-#include "sts/response_handler.h"
-#include "sts/security_token_service_impl.h"
 #include "sts/token_specs.h"
 #include "support/async_call.h"
 #include "support/thrown_message.h"
@@ -63,23 +60,8 @@ LegHandle LegOf(Leg bytes) {
   return std::make_shared<const Leg>(std::move(bytes));
 }
 
-class Sts {
- public:
-  explicit Sts(std::vector<std::string> answers)
-      : transport(std::make_shared<FakeTransport>(std::move(answers))) {}
-
-  std::shared_ptr<const SecurityTokenService> Service() const {
-    return std::make_shared<SecurityTokenServiceImpl>(
-        std::make_shared<RequestBuilderImpl>(boost::none), transport,
-        std::make_shared<ResponseHandlerImpl>(), factory);
-  }
-
-  std::shared_ptr<FakeTransport> transport;
-  std::shared_ptr<FakeTokenFactory> factory = std::make_shared<FakeTokenFactory>();
-};
-
 TEST(NegotiatedLoginTest, ATokenOnTheFirstLegEndsTheLoopAfterOneExchange) {
-  const Sts sts({LastLegAnswer()});
+  const FakeSts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({7})});
   const auto token = sts.Service()->AcquireTokenByGSS(OneHour(), handler);
   ASSERT_NE(token, nullptr);
@@ -92,9 +74,9 @@ TEST(NegotiatedLoginTest, ATokenOnTheFirstLegEndsTheLoopAfterOneExchange) {
 }
 
 TEST(NegotiatedLoginTest, LaterLegsContinueTheNegotiationInOneSession) {
-  const Sts sts({LegAnswer("first"),
-                 LegAnswer("second", "<wst:BinaryExchange>BAU=</wst:BinaryExchange>"),
-                 LastLegAnswer()});
+  const FakeSts sts({LegAnswer("first"),
+                     LegAnswer("second", "<wst:BinaryExchange>BAU=</wst:BinaryExchange>"),
+                     LastLegAnswer()});
   ScriptedHandler handler({LegOf({1}), LegOf({2}), LegOf({})});
   EXPECT_NE(sts.Service()->AcquireTokenByGSS(OneHour(), handler), nullptr);
   EXPECT_EQ(sts.transport->sessions, 1);
@@ -113,7 +95,7 @@ TEST(NegotiatedLoginTest, LaterLegsContinueTheNegotiationInOneSession) {
 }
 
 TEST(NegotiatedLoginTest, TheOperationIsTraced) {
-  const Sts sts({LastLegAnswer()});
+  const FakeSts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({7})});
   const LogCapture log(7);
   const auto token = sts.Service()->AcquireTokenByGSS(OneHour(), handler);
@@ -132,8 +114,8 @@ struct LastLegCase {
 
 class LastLegTest : public testing::TestWithParam<LastLegCase> {};
 
-TEST_P(LastLegTest, IsHandedToTheHandlerWhoseAnswerIsNotSent) {
-  const Sts sts({LastLegAnswer(kAssertionXml, kLeg)});
+TEST_P(LastLegTest, IsPassedToTheHandlerWhoseAnswerIsNotSent) {
+  const FakeSts sts({LastLegAnswer(kAssertionXml, kLeg)});
   ScriptedHandler handler({LegOf({7}), GetParam().afterTheLast});
   const LogCapture log(4);
   EXPECT_NE(sts.Service()->AcquireTokenByGSS(OneHour(), handler), nullptr);
@@ -152,8 +134,8 @@ INSTANTIATE_TEST_SUITE_P(Answers, LastLegTest,
                                          LastLegCase{"Bytes", LegOf({9}), false}),
                          [](const auto& tested) { return tested.param.name; });
 
-TEST(NegotiatedLoginTest, TheLastLegIsHandedOverBeforeTheTokenIsMade) {
-  const Sts sts({LastLegAnswer(kAssertionXml, kLeg)});
+TEST(NegotiatedLoginTest, TheLastLegIsPassedOnBeforeTheTokenIsMade) {
+  const FakeSts sts({LastLegAnswer(kAssertionXml, kLeg)});
   sts.factory->isRefusing = true;
   ScriptedHandler handler({LegOf({7}), nullptr});
   const LogCapture log(5);
@@ -165,7 +147,7 @@ TEST(NegotiatedLoginTest, TheLastLegIsHandedOverBeforeTheTokenIsMade) {
 }
 
 TEST(NegotiatedLoginTest, ANullLegFailsBeforeAnythingIsSent) {
-  const Sts sts({LastLegAnswer()});
+  const FakeSts sts({LastLegAnswer()});
   ScriptedHandler handler({nullptr});
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
                 [&] { sts.Service()->AcquireTokenByGSS(OneHour(), handler); }),
@@ -174,7 +156,7 @@ TEST(NegotiatedLoginTest, ANullLegFailsBeforeAnythingIsSent) {
 }
 
 TEST(NegotiatedLoginTest, ALaterNullLegEndsTheLogin) {
-  const Sts sts({LegAnswer("c")});
+  const FakeSts sts({LegAnswer("c")});
   ScriptedHandler handler({LegOf({1}), nullptr});
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
                 [&] { sts.Service()->AcquireTokenByGSS(OneHour(), handler); }),
@@ -184,7 +166,7 @@ TEST(NegotiatedLoginTest, ALaterNullLegEndsTheLogin) {
 
 TEST(NegotiatedLoginTest, AnAnswerWithoutAContextIsRefusedEvenWithAToken) {
   for (const auto& answer : {LegAnswer(""), LastLegAnswer(kAssertionXml, "", "")}) {
-    const Sts sts({answer});
+    const FakeSts sts({answer});
     ScriptedHandler handler({LegOf({1})});
     EXPECT_EQ(ThrownMessage<CommunicationException>(
                   [&] { sts.Service()->AcquireTokenByGSS(OneHour(), handler); }),
@@ -194,7 +176,7 @@ TEST(NegotiatedLoginTest, AnAnswerWithoutAContextIsRefusedEvenWithAToken) {
 }
 
 TEST(NegotiatedLoginTest, TheLifetimeIsCheckedBeforeAnythingIsSent) {
-  const Sts sts({LastLegAnswer()});
+  const FakeSts sts({LastLegAnswer()});
   ScriptedHandler handler({LegOf({1})});
   const LogCapture log(7);
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
@@ -224,12 +206,13 @@ class ThrowingHandler final : public NegotiationHandler {
 
 TEST(NegotiatedLoginTest, WhatTheHandlerThrowsPassesUnchanged) {
   ThrowingHandler handler;
-  EXPECT_THROW(Sts({LegAnswer("c")}).Service()->AcquireTokenByGSS(OneHour(), handler),
+  EXPECT_THROW(FakeSts({LegAnswer("c")}).Service()->AcquireTokenByGSS(OneHour(), handler),
                HandlersOwnFailure);
   const LogCapture log(7);
-  EXPECT_THROW(
-      Sts({LastLegAnswer(kAssertionXml, kLeg)}).Service()->AcquireTokenByGSS(OneHour(), handler),
-      HandlersOwnFailure);
+  EXPECT_THROW(FakeSts({LastLegAnswer(kAssertionXml, kLeg)})
+                   .Service()
+                   ->AcquireTokenByGSS(OneHour(), handler),
+               HandlersOwnFailure);
   EXPECT_EQ(log.Lines().back(), "7 END operation SecurityTokenServiceImpl::AcquireTokenByGSS");
 }
 
@@ -239,17 +222,17 @@ TEST(NegotiatedLoginAsyncTest, ReportsTokenAndErrors) {
   auto spec = OneHour();
   spec.audienceRestriction = {"urn:audience"};
   const LogCapture log(7);
-  Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(spec, handler, call.Callback());
+  FakeSts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(spec, handler, call.Callback());
   EXPECT_NE(call.Wait().token, nullptr);
   EXPECT_EQ(log.Lines().at(1), "7 Requested token with spec `" + Describe(spec) + "'");
   ScriptedHandler nullHandler({nullptr});
   AsyncCall failing;
-  Sts({LastLegAnswer()})
+  FakeSts({LastLegAnswer()})
       .Service()
       ->AcquireTokenByGSSAsync(OneHour(), nullHandler, failing.Callback());
   EXPECT_EQ(failing.Wait().errorType, typeid(Tarnik::InvalidArgumentException).name());
   EXPECT_THROW(
-      Sts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, nullptr),
+      FakeSts({LastLegAnswer()}).Service()->AcquireTokenByGSSAsync(OneHour(), handler, nullptr),
       Tarnik::InvalidArgumentException);
 }
 
@@ -266,7 +249,7 @@ class HandlersOwnException : public SsoException {
 };
 
 TEST(NegotiatedLoginAsyncTest, WhatTheHandlerThrowsReachesTheCallbackUnchanged) {
-  const Sts sts({LastLegAnswer()});
+  const FakeSts sts({LastLegAnswer()});
   FailingHandler<HandlersOwnException> handler;
   AsyncCall call;
   sts.Service()->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
@@ -282,7 +265,7 @@ TEST(NegotiatedLoginAsyncDeathTest, AnotherKindOfExceptionEndsTheProcess) {
       {
         FailingHandler<std::runtime_error> handler;
         AsyncCall call;
-        Sts({LastLegAnswer()})
+        FakeSts({LastLegAnswer()})
             .Service()
             ->AcquireTokenByGSSAsync(OneHour(), handler, call.Callback());
         call.Wait();
@@ -302,7 +285,7 @@ class WaitingHandler final : public NegotiationHandler {
 };
 
 TEST(NegotiatedLoginAsyncTest, ACallReturnsAtOnceAndWorksWithACopyOfTheService) {
-  const Sts sts({LastLegAnswer()});
+  const FakeSts sts({LastLegAnswer()});
   auto service = sts.Service();
   const std::weak_ptr<const SecurityTokenService> original = service;
   WaitingHandler handler;
@@ -317,7 +300,7 @@ TEST(NegotiatedLoginAsyncTest, ACallReturnsAtOnceAndWorksWithACopyOfTheService) 
 
 TEST(NegotiatedLoginTest, OperationsKeepTheirSlotOrder) {
   using Token = std::shared_ptr<const SamlToken>;
-  const auto service = Sts({LastLegAnswer()}).Service();
+  const auto service = FakeSts({LastLegAnswer()}).Service();
   const SecurityTokenService* object = service.get();
   ScriptedHandler handler({LegOf({1})});
   EXPECT_NE((VtableSlot<Token(const void*, const TokenSpec&, NegotiationHandler&)>(object, 1)(

@@ -11,6 +11,7 @@
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/reader.h>
+#include <boost/none.hpp>
 
 #include "describe/describe.h"
 #include "sts/answers.h"

@@ -38,7 +38,7 @@ std::string InDs(const std::string& localName, const std::string& content) {
   return "<ds:" + localName + ">" + content + "</ds:" + localName + ">";
 }
 
-// In the KeyInfo of the signature, which is added if there is none.
+// In the KeyInfo of the signature, which is added if it is missing.
 std::string InKeyInfo(const std::string& xml, const std::string& content) {
   for (const char* endTag : {"</ds:KeyInfo>", "</KeyInfo>"}) {
     const std::string result = AtEndOf(xml, endTag, content);

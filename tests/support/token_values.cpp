@@ -6,7 +6,6 @@
 
 #include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
-#include <tarnik/crypto/certificate.h>
 
 namespace SsoClient::Testing {
 namespace {

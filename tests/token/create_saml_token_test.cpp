@@ -90,7 +90,7 @@ std::string TwiceReferencedXml() {
   return DevSts::SignXml(text.ToXml(), credential.privateKeyPem, credential.certificatePem);
 }
 
-TEST(CreateSamlTokenTest, VerifiesEveryReferenceThoughOneCoversTheToken) {
+TEST(CreateSamlTokenTest, VerifiesEveryReferenceEvenIfOneCoversTheToken) {
   const std::string xml = TwiceReferencedXml();
   const auto resolver = TrustedResolver();
   EXPECT_EQ(CreateSamlToken(xml, resolver.get())->Subject().name, "alice");
@@ -274,7 +274,7 @@ TEST(CreateSamlTokenWithResolverSourceTest, ShowsTheTokenThatItReturns) {
   EXPECT_EQ(issuer, "https://sts.example.com/STS");
 }
 
-TEST(CreateSamlTokenWithResolverSourceTest, IsNotAskedForATokenThatDoesNotRead) {
+TEST(CreateSamlTokenWithResolverSourceTest, IsNotCalledForAnUnreadableToken) {
   bool asked = false;
   const auto source = [&](const SamlToken*) {
     asked = true;

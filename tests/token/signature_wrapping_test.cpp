@@ -120,11 +120,11 @@ TEST(SignatureWrappingControlTest, AcceptsTheOriginalNextToAnotherAssertion) {
 TEST(SignatureWrappingTest, RefusesASecondElementOfTheSameId) {
   const std::string original = OriginalAssertion();
   const auto resolver = TrustedResolver();
-  for (const char* twin : {"<x ID=\"_a1\"/>", "<x Id=\"_a1\"/>", "<x xml:id=\"_a1\"/>"}) {
-    const auto document = ParseXml("<r>" + original + twin + "</r>");
+  for (const char* sameId : {"<x ID=\"_a1\"/>", "<x Id=\"_a1\"/>", "<x xml:id=\"_a1\"/>"}) {
+    const auto document = ParseXml("<r>" + original + sameId + "</r>");
     ElementNode* assertion = FindElement(document->RootElement(), "Assertion");
     EXPECT_THROW(CreateSamlTokenFromDom(assertion, resolver.get()), InvalidSignatureException)
-        << twin;
+        << sameId;
   }
 }
 

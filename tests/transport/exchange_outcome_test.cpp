@@ -17,7 +17,7 @@ TEST(ExchangeOutcomeTest, AFailureKeepsItsMessage) {
   EXPECT_EQ(outcome.failure->Message(), "No answer in time.");
 }
 
-TEST(ExchangeOutcomeTest, AnAnswerIsTwoHundredsAndFiveHundred) {
+TEST(ExchangeOutcomeTest, StatusCodes200To299And500AreAnswers) {
   for (const int code : {200, 201, 202, 204, 250, 299, 500}) {
     const auto response = Tarnik::MakeRef<FakeResponse>(code, "Any", "the body");
     const auto outcome = InterpretResponse(*response);

@@ -160,7 +160,7 @@ TEST(HttpsClientTest, RefusesANullUserAgent) {
             "The HTTP user agent must not be null.");
 }
 
-TEST(HttpsClientTest, CreateSessionIsTheOneSlot) {
+TEST(HttpsClientTest, CreateSessionIsTheOnlySlot) {
   static_assert(!std::has_virtual_destructor_v<Transport>);
   const auto agent = Tarnik::MakeRef<FakeUserAgent>();
   const HttpsClient client(agent.get(), "/", kTimeout);

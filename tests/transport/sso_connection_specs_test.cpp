@@ -198,13 +198,13 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, AFailedHandshakeComesWithItsStream) {
 TEST_F(SsoCustomSslConnectionSpecImplTest, AHandshakeThatCannotBeginIsReportedOnce) {
   LoopbackSocket listener;
   ASSERT_EQ(::listen(listener.Descriptor(), 1), 0);
-  context_->handshakeRefusal = "the server name is none";
+  context_->handshakeRefusal = "the server name is invalid";
   ConnectRecorder recorder;
   MakeSpec("127.0.0.1", listener.Port())->StartConnect(recorder.Completion());
   recorder.Wait();
   EXPECT_EQ(recorder.calls, 1);
   EXPECT_TRUE(recorder.hasError);
-  EXPECT_EQ(recorder.message, "the server name is none");
+  EXPECT_EQ(recorder.message, "the server name is invalid");
   ASSERT_NE(recorder.lastStream, nullptr);
   recorder.lastStream->Close();
 }

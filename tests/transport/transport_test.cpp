@@ -1,11 +1,12 @@
 #include "transport/transport.h"
 
-#include <algorithm>
 #include <array>
 #include <new>
 #include <string>
 
 #include <gtest/gtest.h>
+
+#include "support/holds_text.h"
 
 namespace SsoClient::Testing {
 namespace {
@@ -25,13 +26,9 @@ TEST(SoapRequestTest, CleansesItsBodyWhenItIsDestroyed) {
   alignas(SoapRequest) std::array<unsigned char, sizeof(SoapRequest)> storage{};
   auto* request = new (storage.data()) SoapRequest();
   request->body = secret;
-  const auto holdsSecret = [&] {
-    return std::search(storage.begin(), storage.end(), secret.begin(), secret.end()) !=
-           storage.end();
-  };
-  EXPECT_TRUE(holdsSecret());
+  EXPECT_TRUE(HoldsText(storage, secret));
   request->~SoapRequest();
-  EXPECT_FALSE(holdsSecret());
+  EXPECT_FALSE(HoldsText(storage, secret));
 }
 
 }  // namespace

@@ -1,6 +1,5 @@
 #include "xml/builders.h"
 
-#include <algorithm>
 #include <array>
 #include <memory>
 #include <new>
@@ -17,6 +16,7 @@
 #include <tarnik/xml/xml_parse_exception.h>
 
 #include "support/fake_saml_token.h"
+#include "support/holds_text.h"
 #include "support/parse_xml.h"
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
@@ -157,16 +157,12 @@ TEST(TextElementBuilderImplTest, CleansesItsTextWhenItIsDestroyed) {
   alignas(TextElementBuilderImpl) std::array<unsigned char, sizeof(TextElementBuilderImpl)>
       storage{};
   auto* builder = new (storage.data()) TextElementBuilderImpl("a", "E", secret, {});
-  const auto holdsSecret = [&] {
-    return std::search(storage.begin(), storage.end(), secret.begin(), secret.end()) !=
-           storage.end();
-  };
-  EXPECT_TRUE(holdsSecret());
+  EXPECT_TRUE(HoldsText(storage, secret));
   builder->~TextElementBuilderImpl();
-  EXPECT_FALSE(holdsSecret());
+  EXPECT_FALSE(HoldsText(storage, secret));
 }
 
-TEST(PreBuiltElementImplTest, EveryBuildHandsOutTheOneElement) {
+TEST(PreBuiltElementImplTest, EveryBuildReturnsTheSameElement) {
   Tarnik::Ref<Tarnik::Xml::ElementNode> element;
   Tarnik::Xml::CreateElementNode("a", "E", element);
   const PreBuiltElementImpl builder(element);
@@ -211,7 +207,7 @@ TEST(BuilderFactoriesTest, ATokenIsInsertedFromItsText) {
   EXPECT_EQ(BuiltXml(*parent), "<Parent>" + assertion + "</Parent>");
 }
 
-TEST(BuilderFactoriesTest, EveryBuildOfATokenHandsOutTheSameElement) {
+TEST(BuilderFactoriesTest, EveryBuildOfATokenReturnsTheSameElement) {
   const auto builder = MakeTokenElementBuilder(FakeSamlToken("<A/>"));
   EXPECT_EQ(Built(*builder), Built(*builder));
   EXPECT_NE(Built(*builder), Built(*MakeTokenElementBuilder(FakeSamlToken("<A/>"))));
@@ -272,7 +268,7 @@ class FailingBuilder final : public XMLBaseBuilder {
   }
 };
 
-TEST(XMLCompositeBuilderTest, FailuresOfAChildPassUnchangedAndLeaveAPart) {
+TEST(XMLCompositeBuilderTest, FailuresOfAChildPassUnchangedAndLeaveAPartialElement) {
   XMLCompositeBuilder builder(MakeElementBuilder("", "Root"));
   builder.Add(MakeElementBuilder("", "First"))
       .Add(std::make_shared<FailingBuilder>())

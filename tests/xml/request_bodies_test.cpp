@@ -49,7 +49,7 @@ TEST(LifetimeTest, HoldsCreatedThenExpiresInUtc) {
             "<wsu:Created>TIME</wsu:Created><wsu:Expires>TIME</wsu:Expires></wst:Lifetime>");
 }
 
-TEST(LifetimeTest, IsExactlyAsLongAsAsked) {
+TEST(LifetimeTest, IsExactlyAsLongAsRequested) {
   for (const std::int64_t seconds : {1L, 600L, 36L * 60, 86'400L * 365}) {
     const auto times = BuiltTimes(seconds);
     EXPECT_EQ(times.expires.GetUtcTime() - times.created.GetUtcTime(), seconds * 1'000'000);
@@ -70,7 +70,7 @@ TEST(LifetimeTest, ANegativeOneExpiresBeforeItIsCreated) {
   EXPECT_EQ(times.expires.GetUtcTime() - times.created.GetUtcTime(), -60'000'000);
 }
 
-TEST(LifetimeTest, AnEndlessOneStopsAtTheEndOfTime) {
+TEST(LifetimeTest, AnEndlessOneEndsAtTheLastTime) {
   EXPECT_EQ(BuiltTimes(std::numeric_limits<std::int64_t>::max()).expires,
             DateTime::Parse("9999-12-31T23:59:59.999Z"));
 }
@@ -184,7 +184,7 @@ TEST(IssueBodyTest, TheAdviceNamespaceIsTheVendors) {
               testing::MatchesRegex("http://[^/]+/names/2009/12/std-ext/WS-Trust1[.]4/advice"));
 }
 
-TEST(IssueBodyTest, AnyKeyTypeButZeroAsksForAPublicKey) {
+TEST(IssueBodyTest, AnyKeyTypeExceptZeroRequestsAPublicKey) {
   EXPECT_THAT(BodyXml(0, PlainSpec()), HasSubstr("/Bearer</wst:KeyType>"));
   for (const unsigned keyType : {1U, 2U}) {
     EXPECT_THAT(BodyXml(keyType, PlainSpec()),
@@ -216,7 +216,7 @@ TEST(IssueBodyTest, UseKeyFollowsAdviceAndParticipants) {
                                                "</wst:RequestSecurityToken>"));
 }
 
-TEST(IssueBodyTest, AskedTimesComeFromTheSpec) {
+TEST(IssueBodyTest, RequestedTimesComeFromTheSpec) {
   auto spec = PlainSpec();
   spec.tokenLifetimeSec = 3600;
   const auto body = Built(*BuildIssueBody(0, spec));
@@ -295,7 +295,7 @@ TEST(RenewBodyTest, HoldsTheTokenAndALifetime) {
             "</wst:RequestSecurityToken>");
 }
 
-TEST(RenewBodyTest, TheLifetimeIsExactlyAsLongAsAsked) {
+TEST(RenewBodyTest, TheLifetimeIsExactlyAsLongAsRequested) {
   const auto body = Built(*BuildRenewBody(FakeSamlToken("<A/>"), 600));
   EXPECT_EQ(TimeAt(*body, {"Lifetime", "Expires"}).GetUtcTime() -
                 TimeAt(*body, {"Lifetime", "Created"}).GetUtcTime(),

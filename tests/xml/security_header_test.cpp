@@ -29,7 +29,7 @@ TEST(SecurityHeaderTest, HoldsATimestampInUtcAndThenWhatIsAdded) {
             "<wsu:Expires>TIME</wsu:Expires></wsu:Timestamp><Token/></wsse:Security>");
 }
 
-TEST(SecurityHeaderTest, IsValidFromNowForTheMinutesAsked) {
+TEST(SecurityHeaderTest, IsValidFromNowForTheRequestedMinutes) {
   const auto before = GetUtcDateTime().GetUtcTime() / 1000;
   const auto header = Built(*BuildSecurityHeader(10));
   const auto after = GetUtcDateTime().GetUtcTime() / 1000;

@@ -12,8 +12,6 @@
 #include <tarnik/core/object_impl.h>
 
 #include "sts/answers.h"
-#include "sts/request_builder.h"
-#include "sts/response_handler.h"
 #include "sts/token_specs.h"
 #include "support/assertion_text.h"
 #include "support/holder_of_key.h"
@@ -26,7 +24,6 @@ namespace {
 using namespace InternalApi;
 using testing::ElementsAre;
 using testing::HasSubstr;
-using testing::IsEmpty;
 using testing::Not;
 
 class CreateGssNegotiationContextTest : public testing::Test {
@@ -65,7 +62,7 @@ TEST_F(CreateGssNegotiationContextTest, CookiesTravelFromLegToLeg) {
   EXPECT_THAT(requests[1], HasSubstr("\r\nCookie: leg=1\r\n"));
 }
 
-TEST_F(CreateGssNegotiationContextTest, HandsTheTlsValuesOn) {
+TEST_F(CreateGssNegotiationContextTest, PassesTheTlsValuesOn) {
   const auto sslContext = Tarnik::MakeRef<FakeSslContext>();
   SecurityTokenServiceConfig config;
   config.url = "https://127.0.0.1:" + std::to_string(server_.Port()) + "/";

@@ -12,6 +12,7 @@
 #include <tarnik/core/ref.h>
 #include <tarnik/system/date_time.h>
 #include <tarnik/xml/security/key_info_resolver.h>
+#include <boost/none.hpp>
 
 #include "sts/answers.h"
 #include "sts/fakes.h"
@@ -113,7 +114,7 @@ TEST_F(GssNegotiationContextImplTest, AnEmptyContextStartsANewNegotiation) {
   EXPECT_THAT(transport_->bodies[1], HasSubstr("<wst:Lifetime"));
 }
 
-TEST_F(GssNegotiationContextImplTest, AFailedExchangeKeepsTheContextOfTheLegBefore) {
+TEST_F(GssNegotiationContextImplTest, AFailedExchangeKeepsThePreviousContext) {
   Answer({LegAnswer("c1")});
   context_->Negotiate({7});
   transport_->failure.emplace("timed out");
@@ -123,7 +124,7 @@ TEST_F(GssNegotiationContextImplTest, AFailedExchangeKeepsTheContextOfTheLegBefo
   EXPECT_THAT(transport_->bodies[2], HasSubstr("Context=\"c1\""));
 }
 
-TEST_F(GssNegotiationContextImplTest, AFaultKeepsTheContextOfTheLegBefore) {
+TEST_F(GssNegotiationContextImplTest, AFaultKeepsThePreviousContext) {
   Answer({LegAnswer("c1"), Envelope(Fault("wst:FailedAuthentication", "no")), LegAnswer("c2")});
   context_->Negotiate({7});
   EXPECT_EQ(ThrownMessage<InvalidCredentialsException>([&] { context_->Negotiate({8}); }),
@@ -146,7 +147,7 @@ TEST_F(GssNegotiationContextImplTest, ALegAfterTheTokenContinuesWithTheLastConte
   EXPECT_THAT(transport_->bodies[1], HasSubstr("Context=\"c\""));
 }
 
-TEST_F(GssNegotiationContextImplTest, NegotiateIsTheOneSlot) {
+TEST_F(GssNegotiationContextImplTest, NegotiateIsTheOnlySlot) {
   Answer({LegAnswer("c")});
   using Negotiate = GssNegotiationResult(const void*, const std::vector<unsigned char>&);
   const auto result = VtableSlot<Negotiate>(context_.get(), 0)(context_.get(), {7});
