@@ -16,9 +16,10 @@
 namespace {
 
 std::optional<std::string> AcceptedValues(const std::string& xml) {
-  static const auto resolver = TestSupport::TrustedResolver();
+  static const auto resolver = SsoClient::Testing::TrustedResolver();
   try {
-    return TestSupport::AllValues(*SsoClient::CreateSamlToken(xml, resolver.get(), 1'000'000));
+    return SsoClient::Testing::AllValues(
+        *SsoClient::CreateSamlToken(xml, resolver.get(), 1'000'000));
   } catch (const Tarnik::Exception&) {
     return std::nullopt;
   }
@@ -34,7 +35,7 @@ const std::vector<Original>& Originals() {
   static const std::vector<Original> originals = [] {
     std::vector<Original> all;
     for (std::size_t kind = 0; kind < 8; ++kind) {
-      TestSupport::TokenEditor maker([kind](std::size_t bound) { return kind % bound; });
+      SsoClient::Testing::TokenEditor maker([kind](std::size_t bound) { return kind % bound; });
       const std::string xml = maker.SignedXml();
       const auto values = AcceptedValues(xml);
       Fuzz::Require(values.has_value());
@@ -51,7 +52,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   FuzzedDataProvider input(data, size);
   const Original& original =
       Originals()[input.ConsumeIntegralInRange<std::size_t>(0, Originals().size() - 1)];
-  TestSupport::TokenEditor editor([&input](std::size_t bound) {
+  SsoClient::Testing::TokenEditor editor([&input](std::size_t bound) {
     return input.ConsumeIntegralInRange<std::size_t>(0, bound - 1);
   });
   std::string xml = original.xml;
@@ -61,7 +62,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const auto values = AcceptedValues(xml);
   if (values) {
     Fuzz::Require(*values == original.values);
-    Fuzz::Require(TestSupport::SecondOpinionOf(xml).empty());
+    Fuzz::Require(SsoClient::Testing::SecondOpinionOf(xml).empty());
   }
   return 0;
 }

@@ -46,7 +46,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     return 0;
   }
   Fuzz::Require(token->Xml() == text);
-  const std::string values = TestSupport::AllValues(*token);
+  const std::string values = SsoClient::Testing::AllValues(*token);
   if (!Fuzz::HasOddNamespace(*Fuzz::ParseXml(text))) {
     Fuzz::Require(Tarnik::Testing::IsWellFormedForLibXml2(text));
   }
@@ -54,9 +54,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   if (fromTree == nullptr) {
     return 0;
   }
-  Fuzz::Require(TestSupport::AllValues(*fromTree) == values);
+  Fuzz::Require(SsoClient::Testing::AllValues(*fromTree) == values);
   const auto canonical = Read(fromTree->Xml());
-  Fuzz::Require(canonical != nullptr && TestSupport::AllValues(*canonical) == values);
+  Fuzz::Require(canonical != nullptr && SsoClient::Testing::AllValues(*canonical) == values);
   Fuzz::Require(ReadTree(fromTree->Xml())->Xml() == fromTree->Xml());
   return 0;
 }

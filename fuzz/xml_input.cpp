@@ -1,13 +1,12 @@
 #include "xml_input.h"
 
 #include <libxml/uri.h>
-#include <tarnik/core/checked_cast.h>
-#include <tarnik/core/reader.h>
 #include <tarnik/xml/xml_parse_exception.h>
-#include <tarnik/xml/xml_parser.h>
 
 #include <memory>
 #include <string_view>
+
+#include "support/parse_xml.h"
 
 namespace Fuzz {
 namespace {
@@ -49,11 +48,8 @@ bool Declares(const Xml::ElementNode& element, Predicate predicate) {
 }  // namespace
 
 Ref<Xml::Document> ParseXml(const std::string& text) {
-  const auto reader = CreateStringReader(text);
-  const auto handler = Xml::CreateXMLDocumentHandler();
   try {
-    const auto parsed = Xml::CreateXMLParser(reader.get(), handler.get())->Parse();
-    return Ref<Xml::Document>(CheckedCast<Xml::Document>(parsed.get()));
+    return SsoClient::Testing::ParseXml(text);
   } catch (const Xml::XMLParseException&) {
     return nullptr;
   }

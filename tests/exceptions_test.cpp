@@ -1,33 +1,36 @@
-#include <ssoclient/exceptions.h>
-
 #include <cxxabi.h>
 
 #include <cstddef>
+#include <memory>
 #include <new>
+#include <string>
 #include <typeinfo>
+#include <utility>
+
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
 
 #include "support/vtable_slot.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::VtableSlot;
-
 template <class Class>
-class ExceptionClass : public testing::Test {};
+class ExceptionClassTest : public testing::Test {};
 
 using AllClasses = testing::Types<SsoException, CommunicationException, InvalidCredentialsException,
                                   PasswordExpiredException, InvalidTokenException, ParseException,
                                   InvalidSignatureException>;
-TYPED_TEST_SUITE(ExceptionClass, AllClasses);
+TYPED_TEST_SUITE(ExceptionClassTest, AllClasses);
 
-TYPED_TEST(ExceptionClass, CarriesItsMessage) {
+TYPED_TEST(ExceptionClassTest, HoldsItsMessage) {
   const TypeParam fault("what went wrong");
   EXPECT_EQ(fault.Message(), "what went wrong");
   EXPECT_STREQ(fault.what(), "what went wrong");
 }
 
-TYPED_TEST(ExceptionClass, ClonesAndThrowsItsExactClass) {
+TYPED_TEST(ExceptionClassTest, ClonesAndThrowsItsExactClass) {
   const TypeParam original("message");
   const Tarnik::Exception& base = original;
   const std::unique_ptr<Tarnik::Throwable> clone = base.Clone();
@@ -44,7 +47,7 @@ TYPED_TEST(ExceptionClass, ClonesAndThrowsItsExactClass) {
   }
 }
 
-TYPED_TEST(ExceptionClass, KeepsItsSlotOrder) {
+TYPED_TEST(ExceptionClassTest, KeepsItsSlotOrder) {
   const TypeParam fault("message");
   const void* object = &fault;
   EXPECT_STREQ(VtableSlot<const char*(const void*)>(object, 2)(object), "message");
@@ -57,7 +60,7 @@ TYPED_TEST(ExceptionClass, KeepsItsSlotOrder) {
   EXPECT_THROW(VtableSlot<void(const void*)>(object, 7)(object), TypeParam);
 }
 
-TYPED_TEST(ExceptionClass, BeginsItsSlotsWithTheDestructors) {
+TYPED_TEST(ExceptionClassTest, BeginsItsSlotsWithTheDestructors) {
   static int destroyed;
   struct Probe : TypeParam {
     using TypeParam::TypeParam;
@@ -74,7 +77,7 @@ TYPED_TEST(ExceptionClass, BeginsItsSlotsWithTheDestructors) {
   EXPECT_EQ(destroyed, 2);
 }
 
-TEST(Exceptions, RethrowPasswordExpiredThroughThePlatformsBase) {
+TEST(ExceptionsTest, RethrowPasswordExpiredThroughThePlatformsBase) {
   const PasswordExpiredException original("expired");
   const Tarnik::Exception* captured = &original;
   EXPECT_THROW(captured->Clone()->Throw(), PasswordExpiredException);
@@ -91,12 +94,12 @@ bool IsCaughtAs() {
   }
 }
 
-// The one class that a class derives from directly (Itanium C++ ABI, section 2.9.5).
+// The only direct base of a class (Itanium C++ ABI, section 2.9.5).
 const std::type_info& BaseOf(const std::type_info& derived) {
   return *dynamic_cast<const abi::__si_class_type_info&>(derived).__base_type;
 }
 
-TEST(Exceptions, DeriveFromTheirBases) {
+TEST(ExceptionsTest, DeriveFromTheirBases) {
   const std::pair<const std::type_info&, const std::type_info&> cases[] = {
       {typeid(Tarnik::Exception), typeid(Tarnik::Throwable)},
       {typeid(SsoException), typeid(Tarnik::Exception)},
@@ -111,28 +114,28 @@ TEST(Exceptions, DeriveFromTheirBases) {
   }
 }
 
-TYPED_TEST(ExceptionClass, AddsNoDataOfItsOwn) {
+TYPED_TEST(ExceptionClassTest, AddsNoDataOfItsOwn) {
   EXPECT_EQ(sizeof(TypeParam), sizeof(Tarnik::Exception));
 }
 
-TYPED_TEST(ExceptionClass, CopiesItsMessageAndPlace) {
+TYPED_TEST(ExceptionClassTest, CopiesItsMessageAndPlace) {
   const TypeParam original("message");
   const TypeParam copy(original);  // NOLINT(performance-unnecessary-copy-initialization)
   EXPECT_EQ(copy.Message(), "message");
   EXPECT_EQ(copy.Where().line(), original.Where().line());
 }
 
-TEST(Exceptions, CatchBothTokenFailuresAsInvalidToken) {
+TEST(ExceptionsTest, CatchBothTokenFailuresAsInvalidToken) {
   EXPECT_TRUE((IsCaughtAs<ParseException, InvalidTokenException>()));
   EXPECT_TRUE((IsCaughtAs<InvalidSignatureException, InvalidTokenException>()));
   EXPECT_FALSE((IsCaughtAs<CommunicationException, InvalidTokenException>()));
   EXPECT_FALSE((IsCaughtAs<InvalidTokenException, ParseException>()));
 }
 
-TYPED_TEST(ExceptionClass, IsCaughtAsTheLibrarysAndThePlatformsBase) {
+TYPED_TEST(ExceptionClassTest, IsCaughtAsTheLibrarysAndThePlatformsBase) {
   EXPECT_TRUE((IsCaughtAs<TypeParam, SsoException>()));
   EXPECT_TRUE((IsCaughtAs<TypeParam, Tarnik::Exception>()));
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,34 +1,40 @@
-#include <ssoclient/token_spec.h>
-
 #include <cstdint>
+#include <memory>
+#include <string>
 #include <type_traits>
+#include <vector>
 
+#include <gtest/gtest.h>
+#include <ssoclient/principal_id.h>
+#include <ssoclient/saml_token.h>
 #include <ssoclient/saml_token_factory.h>
+#include <ssoclient/token_spec.h>
+#include <tarnik/system/date_time.h>
 
 #include "support/fake_saml_token.h"
 
-// Callers fill and take apart the records by position as well as by name, so the order of their
+// Callers initialise and unpack the records by position as well as by name, so the order of their
 // fields is part of the interface.
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::System::DateTime;
 
 template <class Record>
-class PlainRecord : public testing::Test {};
+class PlainRecordTest : public testing::Test {};
 
 using AllRecords =
     testing::Types<PrincipalId, AdviceAttribute, Advice, Delegate, SubjectNames, TokenSpec>;
-TYPED_TEST_SUITE(PlainRecord, AllRecords);
+TYPED_TEST_SUITE(PlainRecordTest, AllRecords);
 
-TYPED_TEST(PlainRecord, IsAValueWithoutVirtualFunctions) {
+TYPED_TEST(PlainRecordTest, IsAValueWithoutVirtualFunctions) {
   EXPECT_TRUE(std::is_aggregate_v<TypeParam>);
   EXPECT_FALSE(std::is_polymorphic_v<TypeParam>);
   EXPECT_TRUE(std::is_copy_constructible_v<TypeParam>);
   EXPECT_TRUE(std::is_copy_assignable_v<TypeParam>);
 }
 
-TEST(Records, HoldTheirFieldsInOrder) {
+TEST(RecordsTest, HoldTheirFieldsInOrder) {
   const PrincipalId principal{"name", "domain"};
   EXPECT_EQ(principal.name, "name");
   EXPECT_EQ(principal.domain, "domain");
@@ -48,9 +54,8 @@ TEST(Records, HoldTheirFieldsInOrder) {
   EXPECT_EQ(names.surname, "last");
 }
 
-TEST(TokenSpec, HoldsItsFieldsInOrder) {
-  const std::shared_ptr<const SamlToken> token =
-      std::make_shared<const Testing::FakeSamlToken>("<a/>");
+TEST(TokenSpecTest, HoldsItsFieldsInOrder) {
+  const std::shared_ptr<const SamlToken> token = std::make_shared<const FakeSamlToken>("<a/>");
   const TokenSpec spec{1,     {"urn:b", "urn:a", "urn:b"}, {{"source", {}}},
                        true,  std::string("bob"),          token,
                        false, CONFIRMATION_BEARER};
@@ -68,7 +73,7 @@ TEST(TokenSpec, HoldsItsFieldsInOrder) {
   EXPECT_EQ(spec.confirmation, CONFIRMATION_BEARER);
 }
 
-TEST(TokenSpec, AsksForNothingUnlessTold) {
+TEST(TokenSpecTest, AsksForNothingByDefault) {
   const TokenSpec spec;
   EXPECT_EQ(spec.tokenLifetimeSec, 0);
   EXPECT_TRUE(spec.audienceRestriction.empty());
@@ -80,11 +85,11 @@ TEST(TokenSpec, AsksForNothingUnlessTold) {
   EXPECT_EQ(spec.confirmation, CONFIRMATION_DEFAULT);
 }
 
-TEST(TokenSpec, CountsItsLifetimeIn64SignedBits) {
+TEST(TokenSpecTest, CountsItsLifetimeIn64SignedBits) {
   EXPECT_TRUE((std::is_same_v<decltype(TokenSpec::tokenLifetimeSec), std::int64_t>));
 }
 
-TEST(ConfirmationTypes, HaveTheirValuesIn32Bits) {
+TEST(ConfirmationTypesTest, HaveTheirValuesIn32Bits) {
   EXPECT_TRUE((std::is_same_v<std::underlying_type_t<ConfirmationType>, std::int32_t>));
   EXPECT_TRUE((std::is_same_v<std::underlying_type_t<TokenConfirmationType>, std::int32_t>));
   EXPECT_EQ(CONFIRMATION_DEFAULT, 0);
@@ -93,11 +98,11 @@ TEST(ConfirmationTypes, HaveTheirValuesIn32Bits) {
   EXPECT_EQ(HOLDER_OF_KEY, 1);
 }
 
-// Who owns one of these owns it through a shared handle, which knows the implementation.
-TEST(Interfaces, HaveNoVirtualDestructor) {
+// They are owned by shared pointers, which destroy the implementation.
+TEST(InterfacesTest, HaveNoVirtualDestructor) {
   EXPECT_FALSE(std::has_virtual_destructor_v<SamlToken>);
   EXPECT_FALSE(std::has_virtual_destructor_v<SamlTokenFactory>);
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

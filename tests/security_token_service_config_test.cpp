@@ -1,31 +1,31 @@
-#include <ssoclient/security_token_service_config.h>
-
 #include <gtest/gtest.h>
-
-#include <string>
+#include <ssoclient/holder_of_key_config.h>
+#include <ssoclient/saml_token_factory.h>
+#include <ssoclient/security_token_service_config.h>
+#include <tarnik/core/object_impl.h>
 
 #include "support/assertion_text.h"
 #include "support/holder_of_key.h"
 #include "transport/fake_http.h"
 #include "transport/fake_ssl.h"
 
-// Callers fill the records by position as well as by name, so the order of their fields is part of
-// the interface.
-namespace SsoClient {
+// Callers initialise the records by position as well as by name, so the order of their fields is
+// part of the interface.
+namespace SsoClient::Testing {
 namespace {
 
 TEST(HolderOfKeyConfigTest, HoldsItsFieldsInOrder) {
-  const auto filled = Testing::ConfigOf(Testing::KeyCredential());
+  const auto filled = ConfigOf(KeyCredential());
   const HolderOfKeyConfig config{filled.certificate, filled.privateKey};
   EXPECT_EQ(config.certificate, filled.certificate);
   EXPECT_EQ(config.privateKey, filled.privateKey);
 }
 
 TEST(SecurityTokenServiceConfigTest, HoldsItsFieldsInOrder) {
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   const auto factory = CreateSamlTokenFactory(nullptr);
-  const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
-  const auto key = Testing::ConfigOf(Testing::KeyCredential());
+  const auto context = Tarnik::MakeRef<FakeSslContext>();
+  const auto key = ConfigOf(KeyCredential());
   const SecurityTokenServiceConfig config{
       "http://sts.example/", resolver.get(), factory, "peer", key, context.get(), true};
   EXPECT_EQ(config.url, "http://sts.example/");
@@ -39,9 +39,9 @@ TEST(SecurityTokenServiceConfigTest, HoldsItsFieldsInOrder) {
 }
 
 TEST(SecurityTokenServiceConfigExTest, HoldsItsFieldsInOrder) {
-  const auto agent = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  const auto agent = Tarnik::MakeRef<FakeUserAgent>();
   const auto factory = CreateSamlTokenFactory(nullptr);
-  const auto key = Testing::ConfigOf(Testing::KeyCredential());
+  const auto key = ConfigOf(KeyCredential());
   const SecurityTokenServiceConfigEx config{"/sts", agent, factory, key};
   EXPECT_EQ(config.url, "/sts");
   EXPECT_EQ(config.userAgent, agent);
@@ -50,7 +50,7 @@ TEST(SecurityTokenServiceConfigExTest, HoldsItsFieldsInOrder) {
   EXPECT_EQ(config.holderOfKeyConfig->privateKey, key.privateKey);
 }
 
-TEST(SecurityTokenServiceConfigTest, NamesNothingUnlessTold) {
+TEST(SecurityTokenServiceConfigTest, IsEmptyByDefault) {
   const SecurityTokenServiceConfig config;
   EXPECT_EQ(config.keyInfoResolver, nullptr);
   EXPECT_FALSE(config.holderOfKeyConfig.has_value());
@@ -59,4 +59,4 @@ TEST(SecurityTokenServiceConfigTest, NamesNothingUnlessTold) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

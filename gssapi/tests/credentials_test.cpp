@@ -18,7 +18,7 @@
 namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::ThrownMessage;
+using Testing::ThrownMessage;
 using namespace std::chrono_literals;
 
 // Tests credentials by the client that a service sees log in with them.

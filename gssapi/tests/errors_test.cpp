@@ -14,8 +14,6 @@
 namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::ThrownMessage;
-
 std::string MessageOf(const GssStatus& status) {
   return ThrownMessage<SsoException>([&] { CheckGssStatus("The attempt failed", status); });
 }

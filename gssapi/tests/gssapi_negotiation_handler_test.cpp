@@ -28,7 +28,6 @@
 namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::ThrownMessage;
 using namespace std::chrono_literals;
 
 using Leg = std::vector<unsigned char>;

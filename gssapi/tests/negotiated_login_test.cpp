@@ -28,8 +28,6 @@
 namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::ThrownMessage;
-
 using Leg = std::vector<unsigned char>;
 
 struct Behavior {
@@ -60,7 +58,7 @@ std::string LegAnswer(const Leg& leg) {
 std::string TokenAnswer(const Leg& leg) {
   return Envelope(Collection(
       Rstr(Exchange(leg) + "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
-               Requested(TestSupport::AssertionText().ToXml()),
+               Requested(AssertionText().ToXml()),
            " Context=\"c\"")));
 }
 

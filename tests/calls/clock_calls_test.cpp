@@ -1,4 +1,4 @@
-// Times that belong together come from one reading of the clock.
+// Times that belong together are computed from one reading of the clock.
 #include <gmock/gmock.h>
 
 #include "calls/recorded_calls.h"
@@ -6,14 +6,14 @@
 #include "xml/request_bodies.h"
 #include "xml/security_header.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using testing::HasSubstr;
 
 class ClockCallsTest : public testing::Test {
  protected:
-  ClockCallsTest() { Testing::ForgetCalls(); }
+  ClockCallsTest() { ForgetCalls(); }
 };
 
 constexpr char kTimes[] =
@@ -21,14 +21,14 @@ constexpr char kTimes[] =
     "<wsu:Expires>2024-03-05T07:18:09.010Z</wsu:Expires>";
 
 TEST_F(ClockCallsTest, ALifetimeBeginsAndEndsByOneReading) {
-  EXPECT_THAT(Testing::BuiltXml(*BuildLifetime(600)), HasSubstr(kTimes));
-  EXPECT_EQ(Testing::Recorded().clockReadings, 1);
+  EXPECT_THAT(BuiltXml(*BuildLifetime(600)), HasSubstr(kTimes));
+  EXPECT_EQ(Recorded().clockReadings, 1);
 }
 
 TEST_F(ClockCallsTest, ATimestampBeginsAndEndsByOneReading) {
-  EXPECT_THAT(Testing::BuiltXml(*BuildSecurityHeader(10)), HasSubstr(kTimes));
-  EXPECT_EQ(Testing::Recorded().clockReadings, 1);
+  EXPECT_THAT(BuiltXml(*BuildSecurityHeader(10)), HasSubstr(kTimes));
+  EXPECT_EQ(Recorded().clockReadings, 1);
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,23 +1,27 @@
 // How connection specs use sockets.
+#include <functional>
+
 #include <gmock/gmock.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/ref.h>
 
 #include "calls/recorded_calls.h"
 #include "transport/fake_ssl.h"
 #include "transport/sso_connection_specs.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::System::Stream;
 using testing::ElementsAre;
-using Testing::Recorded;
 
 constexpr char kSocket[] = "socket of the pool";
 
 class ConnectCallsTest : public testing::Test {
  protected:
-  ConnectCallsTest() { Testing::ForgetCalls(); }
-  ~ConnectCallsTest() override { Testing::ForgetCalls(); }
+  ConnectCallsTest() { ForgetCalls(); }
+  ~ConnectCallsTest() override { ForgetCalls(); }
 
   Tarnik::Ref<SsoCustomSslConnectionSpecImpl> TlsSpec() {
     return Tarnik::MakeRef<SsoCustomSslConnectionSpecImpl>(
@@ -25,12 +29,12 @@ class ConnectCallsTest : public testing::Test {
         Tarnik::MakeRef<SsoCustomConnectionSpecImpl>("sts.example", 8443, false));
   }
 
-  Tarnik::Ref<Testing::FakeSslContext> sslContext_ = Tarnik::MakeRef<Testing::FakeSslContext>();
+  Tarnik::Ref<FakeSslContext> sslContext_ = Tarnik::MakeRef<FakeSslContext>();
 };
 
-TEST_F(ConnectCallsTest, APlainSpecHandsOnItsSocketAsTheStream) {
+TEST_F(ConnectCallsTest, APlainSpecPassesItsSocketAsTheStream) {
   for (const bool flag : {false, true}) {
-    Testing::ForgetCalls();
+    ForgetCalls();
     const auto spec = Tarnik::MakeRef<SsoCustomConnectionSpecImpl>("sts.example", 8443, flag);
     Stream* stream = nullptr;
     Tarnik::Exception* failure = nullptr;
@@ -39,7 +43,7 @@ TEST_F(ConnectCallsTest, APlainSpecHandsOnItsSocketAsTheStream) {
       failure = error;
     });
     EXPECT_THAT(Recorded().log, ElementsAre(kSocket, "connect to sts.example:8443"));
-    Testing::RecordingSocket& socket = *Recorded().lastSocket;
+    RecordingSocket& socket = *Recorded().lastSocket;
     socket.completion(&socket, nullptr);
     EXPECT_EQ(stream, &socket);
     EXPECT_EQ(failure, nullptr);
@@ -58,7 +62,7 @@ TEST_F(ConnectCallsTest, AnEmptyCompletionStaysEmpty) {
 TEST_F(ConnectCallsTest, TheItemHoldsTheSocketThatItCloses) {
   const auto ignore = [](Stream*, Tarnik::Exception*) {};
   for (const bool isTls : {false, true}) {
-    Testing::ForgetCalls();
+    ForgetCalls();
     auto item = isTls ? TlsSpec()->StartConnect(ignore)
                       : Tarnik::MakeRef<SsoCustomConnectionSpecImpl>("sts.example", 8443, false)
                             ->StartConnect(ignore);
@@ -70,7 +74,7 @@ TEST_F(ConnectCallsTest, TheItemHoldsTheSocketThatItCloses) {
   }
 }
 
-TEST_F(ConnectCallsTest, ATlsSpecLendsItsContextToTheConnectUnderWay) {
+TEST_F(ConnectCallsTest, ATlsSpecSharesItsContextWithThePendingConnect) {
   const auto spec = TlsSpec();
   EXPECT_EQ(sslContext_->RefCount(), 2);
   spec->StartConnect([](Stream*, Tarnik::Exception*) {});
@@ -80,14 +84,14 @@ TEST_F(ConnectCallsTest, ATlsSpecLendsItsContextToTheConnectUnderWay) {
   EXPECT_EQ(sslContext_->RefCount(), 2);
 }
 
-TEST_F(ConnectCallsTest, AFailedConnectOfATlsSpecIsHandedOnAtOnce) {
+TEST_F(ConnectCallsTest, AFailedConnectOfATlsSpecIsReportedAtOnce) {
   Stream* stream = nullptr;
   Tarnik::Exception* failure = nullptr;
   TlsSpec()->StartConnect([&](Stream* connected, Tarnik::Exception* error) {
     stream = connected;
     failure = error;
   });
-  Testing::RecordingSocket& socket = *Recorded().lastSocket;
+  RecordingSocket& socket = *Recorded().lastSocket;
   Tarnik::IOException error("refused");
   socket.completion(&socket, &error);
   EXPECT_EQ(stream, &socket);
@@ -97,10 +101,10 @@ TEST_F(ConnectCallsTest, AFailedConnectOfATlsSpecIsHandedOnAtOnce) {
 
 TEST_F(ConnectCallsTest, AnEmptyCompletionFailsWhenATlsSpecsConnectFails) {
   TlsSpec()->StartConnect(nullptr);
-  Testing::RecordingSocket& socket = *Recorded().lastSocket;
+  RecordingSocket& socket = *Recorded().lastSocket;
   Tarnik::IOException error("refused");
   EXPECT_THROW(socket.completion(&socket, &error), std::bad_function_call);
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

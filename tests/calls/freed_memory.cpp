@@ -2,9 +2,12 @@
 
 #include <malloc.h>
 
+#include <atomic>
+#include <cstddef>
 #include <cstdlib>
 #include <cstring>
 #include <new>
+#include <string>
 #include <utility>
 
 namespace SsoClient::Testing {
@@ -40,7 +43,7 @@ void FreedMemory::Look(const void* memory) noexcept {
 }  // namespace SsoClient::Testing
 
 void* operator new(std::size_t size) {
-  // Without what an earlier owner left in it.
+  // Zero-filled, so that it holds nothing from an earlier owner.
   void* memory = std::calloc(1, size != 0 ? size : 1);
   if (memory == nullptr) {
     throw std::bad_alloc();

@@ -2,13 +2,12 @@
 #define SSOCLIENT_TESTS_CALLS_FREED_MEMORY_H
 
 #include <atomic>
-#include <cstddef>
 #include <string>
 
 namespace SsoClient::Testing {
 
-/// Looks, while it lives, for a text in all memory that `operator delete` gives back, which this
-/// program has one of its own of. One at a time.
+/// Searches all memory that is released during its lifetime for a text. For this the program
+/// replaces `operator delete`. At most one object may exist at a time.
 class FreedMemory {
  public:
   explicit FreedMemory(std::string text);
@@ -16,7 +15,7 @@ class FreedMemory {
   FreedMemory& operator=(const FreedMemory&) = delete;
   ~FreedMemory();
 
-  /// How many pieces of memory held the text when they were given back.
+  /// The number of blocks that held the text when they were released.
   int Finds() const { return finds_; }
 
   void Look(const void* memory) noexcept;

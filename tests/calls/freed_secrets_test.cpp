@@ -1,8 +1,14 @@
-// What logs somebody in is not left behind in memory.
-#include <gmock/gmock.h>
-#include <tarnik/text/string_util.h>
-
+// Secrets of a login do not remain in released memory.
+#include <memory>
 #include <numeric>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/negotiation_handler.h>
+#include <tarnik/text/string_util.h>
+#include <boost/none.hpp>
 
 #include "calls/freed_memory.h"
 #include "sts/answers.h"
@@ -14,14 +20,8 @@
 #include "sts/token_specs.h"
 #include "support/assertion_text.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
-
-using Testing::FakeTransport;
-using Testing::FreedMemory;
-using Testing::LastLegAnswer;
-using Testing::LegAnswer;
-using Testing::OneHour;
 
 using Leg = std::vector<unsigned char>;
 
@@ -35,7 +35,7 @@ std::string PartOf(const std::string& text) {
   return text.substr(text.size() / 2, 40);
 }
 
-/// Neither as it is nor in Base64.
+/// The leg as it is, or in Base64.
 class FreedLegTest : public testing::TestWithParam<bool> {
  protected:
   std::string Needle() const {
@@ -47,7 +47,7 @@ class FreedLegTest : public testing::TestWithParam<bool> {
   const RequestBuilderImpl builder_{boost::none};
 };
 
-TEST_P(FreedLegTest, TheTestSeesWhatIsLeft) {
+TEST_P(FreedLegTest, LeftoversAreDetected) {
   const FreedMemory memory(Needle());
   const auto copy = [this] {
     return GetParam() ? Tarnik::StringUtil::Base64Encode(leg_)
@@ -57,7 +57,7 @@ TEST_P(FreedLegTest, TheTestSeesWhatIsLeft) {
   EXPECT_EQ(memory.Finds(), 1);
 }
 
-TEST_P(FreedLegTest, IsNotLeftOfARequestThatBeginsANegotiation) {
+TEST_P(FreedLegTest, IsNotLeftByARequestThatBeginsANegotiation) {
   const FreedMemory memory(Needle());
   {
     SoapRequest request;
@@ -66,7 +66,7 @@ TEST_P(FreedLegTest, IsNotLeftOfARequestThatBeginsANegotiation) {
   EXPECT_EQ(memory.Finds(), 0);
 }
 
-TEST_P(FreedLegTest, IsNotLeftOfARequestThatContinuesANegotiation) {
+TEST_P(FreedLegTest, IsNotLeftByARequestThatContinuesANegotiation) {
   const FreedMemory memory(Needle());
   {
     SoapRequest request;
@@ -78,12 +78,12 @@ TEST_P(FreedLegTest, IsNotLeftOfARequestThatContinuesANegotiation) {
 INSTANTIATE_TEST_SUITE_P(Forms, FreedLegTest, testing::Bool(),
                          [](const auto& test) { return test.param ? "Base64" : "Bytes"; });
 
-/// Markup that stands in the text of a token alone.
+/// Markup that occurs only in the text of a token.
 constexpr char kTokenMarkup[] = "</saml2:Issuer><";
 
-TEST(FreedTokenTest, IsNotLeftOfANegotiationByLegs) {
-  const auto transport = std::make_shared<FakeTransport>(
-      LastLegAnswer(TestSupport::AssertionText().ToXml(), Testing::kLeg));
+TEST(FreedTokenTest, IsNotLeftByANegotiationContext) {
+  const auto transport =
+      std::make_shared<FakeTransport>(LastLegAnswer(AssertionText().ToXml(), kLeg));
   InternalApi::GssNegotiationContextImpl context(
       OneHour(), std::make_shared<RequestBuilderImpl>(boost::none), transport->CreateSession(),
       std::make_shared<ResponseHandlerImpl>(), nullptr);
@@ -103,12 +103,12 @@ class QuietHandler final : public NegotiationHandler {
   }
 };
 
-TEST(FreedTokenTest, IsNotLeftOfAnAnswerWithoutAContext) {
+TEST(FreedTokenTest, IsNotLeftByAnAnswerWithoutAContext) {
   const auto transport =
-      std::make_shared<FakeTransport>(LastLegAnswer(TestSupport::AssertionText().ToXml(), {}, ""));
+      std::make_shared<FakeTransport>(LastLegAnswer(AssertionText().ToXml(), {}, ""));
   const SecurityTokenServiceImpl service(std::make_shared<RequestBuilderImpl>(boost::none),
                                          transport, std::make_shared<ResponseHandlerImpl>(),
-                                         std::make_shared<Testing::FakeTokenFactory>());
+                                         std::make_shared<FakeTokenFactory>());
   QuietHandler handler;
   const FreedMemory memory(kTokenMarkup);
   EXPECT_THROW(service.AcquireTokenByGSS(OneHour(), handler), CommunicationException);
@@ -116,4 +116,4 @@ TEST(FreedTokenTest, IsNotLeftOfAnAnswerWithoutAContext) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

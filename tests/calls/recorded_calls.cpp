@@ -1,12 +1,15 @@
 #include "calls/recorded_calls.h"
 
+#include <string>
 #include <string_view>
 #include <utility>
 
 #include <tarnik/core/object_impl.h>
+#include <tarnik/core/ref.h>
 #include <tarnik/core/writer.h>
+#include <tarnik/http/connection_spec.h>
 #include <tarnik/http/http_request.h>
-#include <tarnik/http/http_user_agent.h>
+#include <tarnik/ssl/ssl_context.h>
 #include <tarnik/system/date_time.h>
 
 #include "transport/sso_connection_specs.h"
@@ -69,7 +72,7 @@ void ForgetCalls() {
 
 }  // namespace SsoClient::Testing
 
-// From here on: the functions that stand in for the libraries' own. The linker takes them first.
+// From here on: the functions that replace those of the libraries. The linker finds these first.
 
 namespace SsoClient {
 

@@ -1,6 +1,7 @@
 #ifndef SSOCLIENT_TESTS_CALLS_RECORDED_CALLS_H
 #define SSOCLIENT_TESTS_CALLS_RECORDED_CALLS_H
 
+#include <cstddef>
 #include <string>
 #include <vector>
 
@@ -26,12 +27,12 @@ class RecordingSocket final : public Tarnik::System::TCPClientSocket, public Tar
   ConnectCompletion completion;
 };
 
-/// What was called since the last `ForgetCalls`. This program has functions of its own in place of
-/// those that make specs, cookie stores, user agents, requests and sockets and that read the clock:
-/// what they make does nothing but tell what it is given, and each reading puts the clock on by a
-/// second. For one thread at a time.
+/// The calls since the last `ForgetCalls`. This program replaces the functions that create specs,
+/// cookie stores, user agents, requests and sockets and the one that reads the clock. The objects
+/// they create only record what they are given, and each reading advances the clock by a second.
+/// For one thread at a time.
 struct RecordedCalls {
-  /// One line a call, with its arguments.
+  /// One line per call, with its arguments.
   std::vector<std::string> log;
   std::vector<Tarnik::Ref<FakeUserAgent>> agents;
   Tarnik::Ref<Tarnik::Http::ConnectionSpec> lastSpec;
@@ -44,7 +45,7 @@ struct RecordedCalls {
 RecordedCalls& Recorded();
 void ForgetCalls();
 
-/// What the first reading of the clock gives.
+/// The result of the first reading of the clock.
 inline constexpr char kFirstReading[] = "2024-03-05T07:08:09.010Z";
 
 }  // namespace SsoClient::Testing

@@ -1,20 +1,31 @@
-// How the transport uses the platform, and who makes one with which limits.
+// How the transport uses the platform, and the limits that each of its users sets.
 #include "transport/https_client.h"
+
+#include <memory>
+#include <string>
 
 #include <gmock/gmock.h>
 #include <ssoclient/gss_negotiation_context.h>
 #include <ssoclient/security_token_service.h>
+#include <ssoclient/security_token_service_config.h>
+#include <ssoclient/token_spec.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/http_user_agent.h>
+#include <tarnik/ssl/ssl_context.h>
 
 #include "calls/recorded_calls.h"
+#include "sts/fakes.h"
 #include "transport/fake_ssl.h"
 #include "transport/read_all.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using testing::ElementsAre;
 using testing::IsEmpty;
-using Testing::Recorded;
 using testing::SizeIs;
 
 constexpr unsigned long kTimeout = 5'000'000;
@@ -23,15 +34,15 @@ constexpr char kOwnAgent[] = "user agent: the spec, the cookie store, no pool";
 
 class TransportCallsTest : public testing::Test {
  protected:
-  TransportCallsTest() { Testing::ForgetCalls(); }
-  ~TransportCallsTest() override { Testing::ForgetCalls(); }
+  TransportCallsTest() { ForgetCalls(); }
+  ~TransportCallsTest() override { ForgetCalls(); }
 
-  Tarnik::Ref<Testing::FakeSslContext> sslContext_ = Tarnik::MakeRef<Testing::FakeSslContext>();
+  Tarnik::Ref<FakeSslContext> sslContext_ = Tarnik::MakeRef<FakeSslContext>();
 };
 
 TEST_F(TransportCallsTest, APlainUrlMakesAPlainSpec) {
   for (const bool flag : {false, true}) {
-    Testing::ForgetCalls();
+    ForgetCalls();
     const HttpsClient client("http://sts.example/", sslContext_.get(), "peer", kTimeout, flag);
     EXPECT_THAT(Recorded().log, ElementsAre(std::string("plain spec: sts.example:80, flag ") +
                                             (flag ? "set" : "not set")));
@@ -40,7 +51,7 @@ TEST_F(TransportCallsTest, APlainUrlMakesAPlainSpec) {
 
 TEST_F(TransportCallsTest, AnHttpsUrlMakesATlsSpec) {
   for (const bool flag : {false, true}) {
-    Testing::ForgetCalls();
+    ForgetCalls();
     const HttpsClient client(kHttps, sslContext_.get(), "peer", kTimeout, flag);
     EXPECT_THAT(Recorded().log, ElementsAre(std::string("TLS spec: sts.example:8443, flag ") +
                                             (flag ? "set" : "not set") + ", peer 'peer'"));
@@ -68,13 +79,13 @@ TEST_F(TransportCallsTest, EachSessionHasAnAgentAndCookiesOfItsOwn) {
 }
 
 TEST_F(TransportCallsTest, SessionsOfASharedAgentMakeNothing) {
-  const auto agent = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  const auto agent = Tarnik::MakeRef<FakeUserAgent>();
   const HttpsClient client(agent.get(), kHttps, kTimeout);
   client.CreateSession();
   EXPECT_THAT(Recorded().log, IsEmpty());
 }
 
-TEST_F(TransportCallsTest, ARequestGetsItsHeadersAndThenItsBodyInOneWrite) {
+TEST_F(TransportCallsTest, ARequestHasItsHeadersAndThenItsBodyInOneWrite) {
   const HttpsClient client(kHttps, sslContext_.get(), "", kTimeout, false);
   SoapRequest request;
   request.action = "urn:action";
@@ -89,7 +100,7 @@ TEST_F(TransportCallsTest, ARequestGetsItsHeadersAndThenItsBodyInOneWrite) {
   Tarnik::Ref<Tarnik::Reader> reader;
   session->SendRequest(request, reader);
   EXPECT_THAT(Recorded().log, posted);
-  EXPECT_EQ(Testing::ReadAll(*reader), "answer");
+  EXPECT_EQ(ReadAll(*reader), "answer");
   EXPECT_THAT(agent->waitTimeouts, ElementsAre(kTimeout));
 
   Recorded().log.clear();
@@ -106,37 +117,22 @@ TokenSpec OneMinute() {
   return spec;
 }
 
-class AnyTokenFactory final : public SamlTokenFactory {
- public:
-  std::shared_ptr<const SamlToken> CreateToken(const std::string&) const override {
-    return nullptr;
-  }
-  std::shared_ptr<const SamlToken> CreateToken(const std::string&, long) const override {
-    return nullptr;
-  }
-  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
-    return nullptr;
-  }
-  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*, long) const override {
-    return nullptr;
-  }
-};
-
 SecurityTokenServiceConfig ConfigWith(Tarnik::Ssl::SSLContext* sslContext, bool flag) {
   SecurityTokenServiceConfig config;
   config.url = kHttps;
-  config.tokenFactory = std::make_shared<AnyTokenFactory>();
+  config.tokenFactory = std::make_shared<FakeTokenFactory>();
   config.sslContext = sslContext;
   config.sslPeerName = "peer";
   config.flag = flag;
   return config;
 }
 
-// The fake agents answer nothing that the operations understand; what counts is how long they wait.
+// The fake agents return nothing that the operations understand; only the time that they wait
+// matters.
 
-TEST_F(TransportCallsTest, AServiceGivesEachExchange240SecondsAndHandsItsFlagOn) {
+TEST_F(TransportCallsTest, AServiceGivesEachExchange240SecondsAndPassesItsFlagOn) {
   for (const bool flag : {false, true}) {
-    Testing::ForgetCalls();
+    ForgetCalls();
     const auto service = CreateSecurityTokenService(ConfigWith(sslContext_.get(), flag));
     EXPECT_THAT(Recorded().log, ElementsAre(std::string("TLS spec: sts.example:8443, flag ") +
                                             (flag ? "set" : "not set") + ", peer 'peer'"));
@@ -153,7 +149,7 @@ TEST_F(TransportCallsTest, ANegotiationGivesEachLeg40SecondsOnOneSessionAndSetsN
   EXPECT_THAT(Recorded().log, ElementsAre("TLS spec: sts.example:8443, flag not set, peer 'peer'",
                                           "cookie store ''", kOwnAgent));
   EXPECT_EQ(Recorded().lastSslContext, sslContext_.get());
-  EXPECT_EQ(Recorded().lastSpec->RefCount(), 1);  // the client is gone, and the session goes on
+  EXPECT_EQ(Recorded().lastSpec->RefCount(), 1);  // the client is gone, and the session still works
   EXPECT_THROW(context->Negotiate({1}), Tarnik::Exception);
   EXPECT_THROW(context->Negotiate({1}), Tarnik::Exception);
   ASSERT_THAT(Recorded().agents, SizeIs(1));
@@ -161,4 +157,4 @@ TEST_F(TransportCallsTest, ANegotiationGivesEachLeg40SecondsOnOneSessionAndSetsN
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

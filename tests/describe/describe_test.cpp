@@ -1,16 +1,25 @@
 #include "describe/describe.h"
 
-#include <optional>
+#include <cstdint>
 #include <set>
+#include <string>
+#include <vector>
 
+#include <gtest/gtest.h>
+#include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
+#include <ssoclient/token_spec.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/system/date_time.h>
+#include <tarnik/xml/security/signature.h>
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::System::DateTime;
 
-// A token of set values that notes what it is asked for.
+// A token with settable values that records which functions are called.
 class FakeToken final : public SamlToken {
  public:
   const std::string& Id() const override { return text_; }
@@ -60,30 +69,30 @@ class FakeToken final : public SamlToken {
   std::string text_ = "SECRET";
 };
 
-TEST(Describe, WritesPrincipalWithItsAsymmetricSpacing) {
+TEST(DescribeTest, WritesPrincipalWithItsAsymmetricSpacing) {
   EXPECT_EQ(Describe(PrincipalId{"alice", "CORP"}), "{Name: alice; Domain:CORP}");
   EXPECT_EQ(Describe(PrincipalId{"alice", ""}), "{Name: alice; Domain:}");
   EXPECT_EQ(Describe(PrincipalId{"", ""}), "{Name: ; Domain:}");
 }
 
-TEST(Describe, DoesNotExpandPlaceholdersInValues) {
+TEST(DescribeTest, DoesNotExpandPlaceholdersInValues) {
   EXPECT_EQ(Describe(PrincipalId{"%2", "%1"}), "{Name: %2; Domain:%1}");
 }
 
-TEST(Describe, WritesMissingPrincipalAsNull) {
+TEST(DescribeTest, WritesMissingPrincipalAsNull) {
   const PrincipalId* none = nullptr;
   EXPECT_EQ(Describe(none), "(null)");
   const PrincipalId principal{"alice", "CORP"};
   EXPECT_EQ(Describe(&principal), "{Name: alice; Domain:CORP}");
 }
 
-TEST(Describe, WritesDelegateWithItsInstant) {
+TEST(DescribeTest, WritesDelegateWithItsInstant) {
   const DateTime instant = DateTime::Parse("2024-03-05T07:08:09.010Z");
   EXPECT_EQ(Describe(Delegate{{"bob", "CORP"}, instant}),
             "{Name: bob; Domain:CORP} at 2024-03-05T07:08:09.010Z");
 }
 
-TEST(Describe, JoinsAttributeValuesByPosition) {
+TEST(DescribeTest, JoinsAttributeValuesByPosition) {
   EXPECT_EQ(Describe(AdviceAttribute{"N", {}}), "[source=N, attributes=[]]");
   EXPECT_EQ(Describe(AdviceAttribute{"N", {"a"}}), "[source=N, attributes=[a]]");
   EXPECT_EQ(Describe(AdviceAttribute{"N", {"x", ""}}), "[source=N, attributes=[x, ]]");
@@ -91,7 +100,7 @@ TEST(Describe, JoinsAttributeValuesByPosition) {
   EXPECT_EQ(Describe(AdviceAttribute{"N", {"", ""}}), "[source=N, attributes=[, ]]");
 }
 
-TEST(Describe, WritesAdviceWithItsAttributes) {
+TEST(DescribeTest, WritesAdviceWithItsAttributes) {
   EXPECT_EQ(Describe(Advice{"S", {{"N", {"a", "b"}}}}),
             "Advice [source=S, attributes=[[source=N, attributes=[a, b]]]]");
   EXPECT_EQ(Describe(Advice{"S", {}}), "Advice [source=S, attributes=[]]");
@@ -100,13 +109,13 @@ TEST(Describe, WritesAdviceWithItsAttributes) {
             "attributes=[c]]]]");
 }
 
-TEST(Describe, WritesSpecWithoutOptionalParts) {
+TEST(DescribeTest, WritesSpecWithoutOptionalParts) {
   EXPECT_EQ(Describe(TokenSpec{}),
             "TokenSpec [tokenLifetimeSec=0, delegable=false, delegateTo=<unset>, renewable=false, "
             "confirmationType=0,audienceRestriction=, advice=[]");
 }
 
-TEST(Describe, WritesSpecWithAllParts) {
+TEST(DescribeTest, WritesSpecWithAllParts) {
   TokenSpec spec;
   spec.tokenLifetimeSec = INT64_MIN;
   spec.audienceRestriction = {"urn:b", "urn:a"};
@@ -121,7 +130,7 @@ TEST(Describe, WritesSpecWithAllParts) {
             "urn:b, advice=[Advice [source=S, attributes=[]], Advice [source=T, attributes=[]]]");
 }
 
-TEST(Describe, WritesTheConfirmationTypeAsItsNumber) {
+TEST(DescribeTest, WritesTheConfirmationTypeAsItsNumber) {
   TokenSpec spec;
   spec.confirmation = static_cast<ConfirmationType>(-12);
   EXPECT_EQ(Describe(spec),
@@ -129,7 +138,7 @@ TEST(Describe, WritesTheConfirmationTypeAsItsNumber) {
             "confirmationType=-12,audienceRestriction=, advice=[]");
 }
 
-TEST(Describe, TellsAnEmptyDelegateFromNone) {
+TEST(DescribeTest, DistinguishesAnEmptyDelegateFromNone) {
   TokenSpec spec;
   spec.delegateTo = std::string();
   EXPECT_EQ(Describe(spec),
@@ -137,7 +146,7 @@ TEST(Describe, TellsAnEmptyDelegateFromNone) {
             "confirmationType=0,audienceRestriction=, advice=[]");
 }
 
-TEST(Describe, KeepsTheSeparatorOfAnEmptyAudience) {
+TEST(DescribeTest, KeepsTheSeparatorOfAnEmptyAudience) {
   TokenSpec spec;
   spec.audienceRestriction = {"", "urn:a"};
   EXPECT_EQ(Describe(spec),
@@ -145,14 +154,14 @@ TEST(Describe, KeepsTheSeparatorOfAnEmptyAudience) {
             "confirmationType=0,audienceRestriction=, urn:a, advice=[]");
 }
 
-TEST(CreateSamlTokenDescription, WritesTokenWithoutGroupsAndDelegates) {
+TEST(CreateSamlTokenDescriptionTest, WritesTokenWithoutGroupsAndDelegates) {
   EXPECT_EQ(CreateSamlTokenDescription(FakeToken()),
             "SamlToken [subject={Name: alice; Domain:CORP}, groups=[], delegationChain=[], "
             "startTime=2024-03-05 07:08:09.010 UTC, expirationTime=2024-03-05 08:08:09.000 UTC, "
             "renewable=false, delegable=false, isSolution=false,confirmationType=0]");
 }
 
-TEST(CreateSamlTokenDescription, WritesTokenWithAllParts) {
+TEST(CreateSamlTokenDescriptionTest, WritesTokenWithAllParts) {
   FakeToken token;
   token.renewable = true;
   token.delegable = true;
@@ -170,7 +179,7 @@ TEST(CreateSamlTokenDescription, WritesTokenWithAllParts) {
             "isSolution=true,confirmationType=1]");
 }
 
-TEST(CreateSamlTokenDescription, AsksForEachValueOnceInItsOrder) {
+TEST(CreateSamlTokenDescriptionTest, AsksForEachValueOnceInItsOrder) {
   const FakeToken token;
   CreateSamlTokenDescription(token);
   EXPECT_EQ(token.asked,
@@ -179,9 +188,9 @@ TEST(CreateSamlTokenDescription, AsksForEachValueOnceInItsOrder) {
                                       "IsSolution", "ConfirmationType"}));
 }
 
-TEST(CreateSamlTokenDescription, NeverTellsTheXml) {
+TEST(CreateSamlTokenDescriptionTest, NeverContainsTheXml) {
   EXPECT_EQ(CreateSamlTokenDescription(FakeToken()).find("SECRET"), std::string::npos);
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,18 +1,19 @@
 #include "faults/fault_injection.h"
 
-#include <openssl/evp.h>
-
+#include <cstddef>
 #include <cstdlib>
 #include <new>
 
+#include <openssl/evp.h>
+
 extern "C" void* __real_malloc(std::size_t size);
 
-namespace FaultInjection {
+namespace SsoClient::Testing {
 namespace {
 
 struct Plan {
   bool isArmed = false;
-  Kind kind = Kind::kAllocation;
+  FaultKind kind = FaultKind::kAllocation;
   std::size_t callsToGo = 0;
   int result = 0;
   bool hasHappened = false;
@@ -20,7 +21,7 @@ struct Plan {
 
 Plan plan;
 
-bool Fails(Kind kind) noexcept {
+bool Fails(FaultKind kind) noexcept {
   if (!plan.isArmed || plan.kind != kind || plan.hasHappened) {
     return false;
   }
@@ -30,27 +31,27 @@ bool Fails(Kind kind) noexcept {
 }
 
 void* Allocate(std::size_t size) noexcept {
-  return Fails(Kind::kAllocation) ? nullptr : __real_malloc(size);
+  return Fails(FaultKind::kAllocation) ? nullptr : __real_malloc(size);
 }
 
 }  // namespace
 
-Fault::Fault(Kind kind, std::size_t index, int result) noexcept {
+InjectedFault::InjectedFault(FaultKind kind, std::size_t index, int result) noexcept {
   plan = {true, kind, index, result, false};
 }
 
-Fault::~Fault() {
+InjectedFault::~InjectedFault() {
   plan.isArmed = false;
 }
 
-bool Fault::HasHappened() const noexcept {
+bool InjectedFault::HasHappened() const noexcept {
   return plan.hasHappened;
 }
 
-}  // namespace FaultInjection
+}  // namespace SsoClient::Testing
 
 void* operator new(std::size_t size) {
-  void* memory = FaultInjection::Allocate(size);
+  void* memory = SsoClient::Testing::Allocate(size);
   if (memory == nullptr) {
     throw std::bad_alloc();
   }
@@ -65,31 +66,31 @@ void operator delete(void* memory, std::size_t) noexcept {
   std::free(memory);
 }
 
-// The linker sends the calls of the libraries under test here (its option --wrap).
+// The linker redirects the calls of the libraries under test to these functions (option --wrap).
 extern "C" {
 
 void* __wrap_malloc(std::size_t size) {
-  return FaultInjection::Allocate(size);
+  return SsoClient::Testing::Allocate(size);
 }
 
 int __real_EVP_DigestInit_ex2(EVP_MD_CTX* context, const EVP_MD* type, const OSSL_PARAM* params);
 int __wrap_EVP_DigestInit_ex2(EVP_MD_CTX* context, const EVP_MD* type, const OSSL_PARAM* params) {
-  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
-             ? FaultInjection::plan.result
+  return SsoClient::Testing::Fails(SsoClient::Testing::FaultKind::kCrypto)
+             ? SsoClient::Testing::plan.result
              : __real_EVP_DigestInit_ex2(context, type, params);
 }
 
 int __real_EVP_DigestUpdate(EVP_MD_CTX* context, const void* data, std::size_t size);
 int __wrap_EVP_DigestUpdate(EVP_MD_CTX* context, const void* data, std::size_t size) {
-  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
-             ? FaultInjection::plan.result
+  return SsoClient::Testing::Fails(SsoClient::Testing::FaultKind::kCrypto)
+             ? SsoClient::Testing::plan.result
              : __real_EVP_DigestUpdate(context, data, size);
 }
 
 int __real_EVP_DigestFinal_ex(EVP_MD_CTX* context, unsigned char* digest, unsigned* size);
 int __wrap_EVP_DigestFinal_ex(EVP_MD_CTX* context, unsigned char* digest, unsigned* size) {
-  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
-             ? FaultInjection::plan.result
+  return SsoClient::Testing::Fails(SsoClient::Testing::FaultKind::kCrypto)
+             ? SsoClient::Testing::plan.result
              : __real_EVP_DigestFinal_ex(context, digest, size);
 }
 
@@ -99,8 +100,8 @@ int __real_EVP_PKEY_verify(EVP_PKEY_CTX* context, const unsigned char* signature
 int __wrap_EVP_PKEY_verify(EVP_PKEY_CTX* context, const unsigned char* signature,
                            std::size_t signatureSize, const unsigned char* digest,
                            std::size_t digestSize) {
-  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
-             ? FaultInjection::plan.result
+  return SsoClient::Testing::Fails(SsoClient::Testing::FaultKind::kCrypto)
+             ? SsoClient::Testing::plan.result
              : __real_EVP_PKEY_verify(context, signature, signatureSize, digest, digestSize);
 }
 
@@ -110,8 +111,8 @@ int __real_EVP_PKEY_sign(EVP_PKEY_CTX* context, unsigned char* signature,
 int __wrap_EVP_PKEY_sign(EVP_PKEY_CTX* context, unsigned char* signature,
                          std::size_t* signatureSize, const unsigned char* digest,
                          std::size_t digestSize) {
-  return FaultInjection::Fails(FaultInjection::Kind::kCrypto)
-             ? FaultInjection::plan.result
+  return SsoClient::Testing::Fails(SsoClient::Testing::FaultKind::kCrypto)
+             ? SsoClient::Testing::plan.result
              : __real_EVP_PKEY_sign(context, signature, signatureSize, digest, digestSize);
 }
 }

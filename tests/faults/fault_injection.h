@@ -1,28 +1,28 @@
-#ifndef SSOCLIENT_TESTS_FAULT_INJECTION_H
-#define SSOCLIENT_TESTS_FAULT_INJECTION_H
+#ifndef SSOCLIENT_TESTS_FAULTS_FAULT_INJECTION_H
+#define SSOCLIENT_TESTS_FAULTS_FAULT_INJECTION_H
 
 #include <cstddef>
 
-/// Makes one call of a kind fail: an allocation by operator new or by the library's own malloc,
-/// which Expat's memory comes from, or a call of OpenSSL's that digests, verifies or signs. For one
+/// Makes one call of a kind fail: an allocation by operator new or by the library's calls of
+/// malloc, which supply Expat's memory, or an OpenSSL call that digests, verifies or signs. For one
 /// thread at a time.
-namespace FaultInjection {
+namespace SsoClient::Testing {
 
-enum class Kind { kAllocation, kCrypto };
+enum class FaultKind { kAllocation, kCrypto };
 
-/// From its making to its end, the call of `kind` with this index (counted from 0) fails; one of
-/// crypto gives `result`.
-class Fault {
+/// During its lifetime the call of `kind` with this index (counted from 0) fails; a crypto call
+/// returns `result`.
+class InjectedFault {
  public:
-  Fault(Kind kind, std::size_t index, int result = 0) noexcept;
-  ~Fault();
-  Fault(const Fault&) = delete;
-  Fault& operator=(const Fault&) = delete;
+  InjectedFault(FaultKind kind, std::size_t index, int result = 0) noexcept;
+  ~InjectedFault();
+  InjectedFault(const InjectedFault&) = delete;
+  InjectedFault& operator=(const InjectedFault&) = delete;
 
-  /// False when there were fewer calls.
+  /// False if there were fewer calls.
   bool HasHappened() const noexcept;
 };
 
-}  // namespace FaultInjection
+}  // namespace SsoClient::Testing
 
 #endif

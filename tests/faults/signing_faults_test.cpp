@@ -1,24 +1,33 @@
-#include <tarnik/core/exception.h>
-#include <tarnik/crypto/private_key.h>
-#include <tarnik/xml/security/signature.h>
-#include <tarnik/xml/security/xml_security_exception.h>
-#include <tarnik/xml/xml_writer.h>
+#include <cstddef>
+#include <new>
+#include <string>
 
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
 #include <gtest/gtest.h>
-
-#include <new>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/private_key.h>
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/signature.h>
+#include <tarnik/xml/security/xml_security_exception.h>
+#include <tarnik/xml/xml_writer.h>
 
 #include "faults/fault_injection.h"
+#include "support/parse_xml.h"
 
-// One call fails in the midst of making a signature: it is blank again, and signing it once more
-// gives what a judge accepts.
-namespace Tarnik::Xml::Security {
+// One call fails while a signature is made: the signature is blank again, and signing it once more
+// gives a signature that an independent verifier accepts.
+namespace SsoClient::Testing {
 namespace {
 
-using FaultInjection::Fault;
-using FaultInjection::Kind;
+using Tarnik::Ref;
+using Tarnik::Crypto::CreatePrivateKeyFromPem;
+using Tarnik::Crypto::PrivateKey;
+using Tarnik::Xml::CreateElementNode;
+using Tarnik::Xml::ElementNode;
+using Tarnik::Xml::Security::CreateBlankSignature;
+using Tarnik::Xml::Security::Signature;
+using Tarnik::Xml::Security::XmlSecurityException;
 
 constexpr const char* kExclusive = "http://www.w3.org/2001/10/xml-exc-c14n#";
 constexpr const char* kSha256 = "http://www.w3.org/2001/04/xmlenc#sha256";
@@ -26,17 +35,11 @@ constexpr const char* kRsaSha256 = "http://www.w3.org/2001/04/xmldsig-more#rsa-s
 
 enum class Outcome { kSigned, kRefused, kOutOfMemory };
 
-std::string TextOf(const Node* node) {
-  const Ref<StringWriter> writer = CreateStringWriter();
-  WriteXml(node, writer.get());
-  return writer->Text();
-}
-
-class SigningFaults : public testing::Test {
+class SigningFaultsTest : public testing::Test {
  protected:
-  SigningFaults() : signer_(MakeSigner()) {
-    key_ = Crypto::CreatePrivateKeyFromPem(signer_.privateKeyPem);
-    // What is set up once for a key or in the process is not under test.
+  SigningFaultsTest() : signer_(MakeSigner()) {
+    key_ = CreatePrivateKeyFromPem(signer_.privateKeyPem);
+    // What is set up once per key or per process is not under test.
     Prepare();
     EXPECT_EQ(Sign(), Outcome::kSigned);
   }
@@ -70,15 +73,15 @@ class SigningFaults : public testing::Test {
     }
   }
 
-  /// Signs with each call of `kind` failing in its turn; gives the number of them.
-  std::size_t FailEachCall(Kind kind, int result, Outcome expected) {
+  /// Signs with each call of `kind` failing in turn; returns the number of calls.
+  std::size_t FailEachCall(FaultKind kind, int result, Outcome expected) {
     for (std::size_t index = 0;; ++index) {
       Prepare();
-      const std::string blank = TextOf(signature_->Element());
+      const std::string blank = XmlText(signature_->Element());
       Outcome outcome;
       bool happened = false;
       {
-        const Fault fault(kind, index, result);
+        const InjectedFault fault(kind, index, result);
         outcome = Sign();
         happened = fault.HasHappened();
       }
@@ -87,36 +90,36 @@ class SigningFaults : public testing::Test {
         return index;
       }
       EXPECT_EQ(outcome, expected) << index;
-      EXPECT_EQ(TextOf(signature_->Element()), blank) << index;
+      EXPECT_EQ(XmlText(signature_->Element()), blank) << index;
       EXPECT_EQ(Sign(), Outcome::kSigned) << index;
       request_->AppendChild(signature_->Element());
-      EXPECT_TRUE(DevSts::VerifyXml(TextOf(request_.get()), signer_.certificatePem)) << index;
+      EXPECT_TRUE(DevSts::VerifyXml(XmlText(request_.get()), signer_.certificatePem)) << index;
     }
   }
 
   const DevSts::Credential signer_;
-  Ref<const Crypto::PrivateKey> key_;
+  Ref<const PrivateKey> key_;
   Ref<ElementNode> request_;
   Ref<Signature> signature_;
 };
 
-TEST_F(SigningFaults, LeaveABlankSignatureWhenMemoryIsOut) {
-  EXPECT_GT(FailEachCall(Kind::kAllocation, 0, Outcome::kOutOfMemory), 10U);
+TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenMemoryRunsOut) {
+  EXPECT_GT(FailEachCall(FaultKind::kAllocation, 0, Outcome::kOutOfMemory), 10U);
 }
 
-TEST_F(SigningFaults, LeaveABlankSignatureWhenTheCryptographicLibraryFails) {
+TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenTheCryptographicLibraryFails) {
   for (const int result : {0, -1}) {
     // Two digests of three calls or more, and one signature.
-    EXPECT_GE(FailEachCall(Kind::kCrypto, result, Outcome::kRefused), 7U);
+    EXPECT_GE(FailEachCall(FaultKind::kCrypto, result, Outcome::kRefused), 7U);
   }
 }
 
-// Each construction step fails in turn: nothing leaks, and nothing half made is handed out.
-TEST_F(SigningFaults, LeaveNothingBehindWhenASignatureIsBegun) {
+// Each construction step fails in turn: nothing leaks, and no partly built object is returned.
+TEST_F(SigningFaultsTest, LeakNothingWhenASignatureCannotBeBegun) {
   std::size_t failures = 0;
   for (bool happened = true; happened; ++failures) {
     Ref<Signature> made;
-    const Fault fault(Kind::kAllocation, failures);
+    const InjectedFault fault(FaultKind::kAllocation, failures);
     try {
       CreateBlankSignature(request_.get(), kExclusive, kRsaSha256, "ds", made);
     } catch (const std::bad_alloc&) {
@@ -128,24 +131,24 @@ TEST_F(SigningFaults, LeaveNothingBehindWhenASignatureIsBegun) {
   EXPECT_GT(failures, 5U);
 }
 
-TEST_F(SigningFaults, LeaveABlankSignatureWhenAReferenceCannotBeAdded) {
+TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenAReferenceCannotBeAdded) {
   std::size_t failures = 0;
   for (bool happened = true; happened; ++failures) {
     Prepare();
-    const std::string blank = TextOf(signature_->Element());
+    const std::string blank = XmlText(signature_->Element());
     {
-      const Fault fault(Kind::kAllocation, failures);
+      const InjectedFault fault(FaultKind::kAllocation, failures);
       try {
         signature_->AddReference("#body", kSha256);
       } catch (const std::bad_alloc&) {
       }
       happened = fault.HasHappened();
     }
-    EXPECT_EQ(TextOf(signature_->Element()) == blank, happened) << failures;
+    EXPECT_EQ(XmlText(signature_->Element()) == blank, happened) << failures;
     EXPECT_EQ(Sign(), Outcome::kSigned) << failures;
   }
   EXPECT_GT(failures, 5U);
 }
 
 }  // namespace
-}  // namespace Tarnik::Xml::Security
+}  // namespace SsoClient::Testing

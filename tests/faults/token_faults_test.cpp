@@ -1,25 +1,28 @@
-#include <ssoclient/saml_token.h>
+#include <cstddef>
+#include <new>
+#include <string>
+#include <vector>
 
 #include <gtest/gtest.h>
-
-#include <new>
+#include <ssoclient/saml_token.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 
 #include "faults/fault_injection.h"
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
 
-// One call fails in the midst of reading and verifying a token: a forged one is never accepted, a
-// good one never for the wrong reason, and nothing leaks.
-namespace SsoClient {
+// One call fails while a token is read and verified: a forged token is never accepted, a good one
+// is never accepted for the wrong reason, and nothing leaks.
+namespace SsoClient::Testing {
 namespace {
 
-using FaultInjection::Fault;
-using FaultInjection::Kind;
 using Tarnik::Xml::Security::KeyInfoResolver;
 
 enum class Verdict { kAccepted, kRefused, kOutOfMemory };
 
-Verdict Judge(const std::string& xml, const KeyInfoResolver* resolver) {
+Verdict VerdictOn(const std::string& xml, const KeyInfoResolver* resolver) {
   try {
     CreateSamlToken(xml, resolver);
     return Verdict::kAccepted;
@@ -36,32 +39,28 @@ struct Forgery {
 };
 
 std::vector<Forgery> Forgeries() {
-  const std::string original = TestSupport::OriginalAssertion();
-  using TestSupport::ForgedId;
-  using TestSupport::ForgedSignature;
-  return {{"Tampered", TestSupport::Replaced(original, "alice@", "admin@")},
-          {"Stranger",
-           TestSupport::ForgedAssertion(ForgedId::kSame, ForgedSignature::kStranger, original)},
-          {"MadeUp",
-           TestSupport::ForgedAssertion(ForgedId::kSame, ForgedSignature::kMadeUp, original)}};
+  const std::string original = OriginalAssertion();
+  return {{"Tampered", Replaced(original, "alice@", "admin@")},
+          {"Stranger", ForgedAssertion(ForgedId::kSame, ForgedSignature::kStranger, original)},
+          {"MadeUp", ForgedAssertion(ForgedId::kSame, ForgedSignature::kMadeUp, original)}};
 }
 
-class TokenFaults : public testing::Test {
+class TokenFaultsTest : public testing::Test {
  protected:
-  // What is set up once in the process is not under test.
-  void SetUp() override { ASSERT_EQ(Judge(original_, resolver_.get()), Verdict::kAccepted); }
+  // What is set up once per process is not under test.
+  void SetUp() override { ASSERT_EQ(VerdictOn(original_, resolver_.get()), Verdict::kAccepted); }
 
-  const std::string original_ = TestSupport::OriginalAssertion();
-  const Tarnik::Ref<const KeyInfoResolver> resolver_ = TestSupport::TrustedResolver();
+  const std::string original_ = OriginalAssertion();
+  const Tarnik::Ref<const KeyInfoResolver> resolver_ = TrustedResolver();
 };
 
-TEST_F(TokenFaults, GoodTokenIsReadOrMemoryIsOut) {
+TEST_F(TokenFaultsTest, GoodTokenIsReadOrMemoryRunsOut) {
   std::size_t failures = 0;
   for (bool happened = true; happened;) {
     Verdict verdict;
     {
-      const Fault fault(Kind::kAllocation, failures);
-      verdict = Judge(original_, resolver_.get());
+      const InjectedFault fault(FaultKind::kAllocation, failures);
+      verdict = VerdictOn(original_, resolver_.get());
       happened = fault.HasHappened();
     }
     ASSERT_EQ(verdict, happened ? Verdict::kOutOfMemory : Verdict::kAccepted) << failures;
@@ -70,12 +69,12 @@ TEST_F(TokenFaults, GoodTokenIsReadOrMemoryIsOut) {
   EXPECT_GT(failures, 50U);
 }
 
-TEST_F(TokenFaults, ForgedTokenIsNeverAcceptedWhenMemoryIsOut) {
+TEST_F(TokenFaultsTest, ForgedTokenIsNeverAcceptedWhenMemoryRunsOut) {
   for (const Forgery& forgery : Forgeries()) {
     std::size_t failures = 0;
     for (bool happened = true; happened; ++failures) {
-      const Fault fault(Kind::kAllocation, failures);
-      const Verdict verdict = Judge(forgery.xml, resolver_.get());
+      const InjectedFault fault(FaultKind::kAllocation, failures);
+      const Verdict verdict = VerdictOn(forgery.xml, resolver_.get());
       happened = fault.HasHappened();
       ASSERT_EQ(verdict, happened ? Verdict::kOutOfMemory : Verdict::kRefused)
           << forgery.name << " " << failures;
@@ -84,13 +83,13 @@ TEST_F(TokenFaults, ForgedTokenIsNeverAcceptedWhenMemoryIsOut) {
   }
 }
 
-class CryptoFaults : public TokenFaults, public testing::WithParamInterface<int> {};
+class CryptoFaultsTest : public TokenFaultsTest, public testing::WithParamInterface<int> {};
 
-TEST_P(CryptoFaults, AreNeverTakenForAGoodSignature) {
+TEST_P(CryptoFaultsTest, AreNeverTakenForAGoodSignature) {
   std::size_t calls = 0;
   for (bool happened = true; happened; ++calls) {
-    const Fault fault(Kind::kCrypto, calls, GetParam());
-    const Verdict verdict = Judge(original_, resolver_.get());
+    const InjectedFault fault(FaultKind::kCrypto, calls, GetParam());
+    const Verdict verdict = VerdictOn(original_, resolver_.get());
     happened = fault.HasHappened();
     ASSERT_EQ(verdict, happened ? Verdict::kRefused : Verdict::kAccepted) << calls;
   }
@@ -98,19 +97,19 @@ TEST_P(CryptoFaults, AreNeverTakenForAGoodSignature) {
   EXPECT_GE(calls, 8U);
 }
 
-TEST_P(CryptoFaults, DoNotHelpAForgery) {
+TEST_P(CryptoFaultsTest, DoNotHelpAForgery) {
   for (const Forgery& forgery : Forgeries()) {
     std::size_t calls = 0;
     for (bool happened = true; happened; ++calls) {
-      const Fault fault(Kind::kCrypto, calls, GetParam());
-      ASSERT_EQ(Judge(forgery.xml, resolver_.get()), Verdict::kRefused)
+      const InjectedFault fault(FaultKind::kCrypto, calls, GetParam());
+      ASSERT_EQ(VerdictOn(forgery.xml, resolver_.get()), Verdict::kRefused)
           << forgery.name << " " << calls;
       happened = fault.HasHappened();
     }
   }
 }
 
-INSTANTIATE_TEST_SUITE_P(Results, CryptoFaults, testing::Values(0, -1));
+INSTANTIATE_TEST_SUITE_P(Results, CryptoFaultsTest, testing::Values(0, -1));
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

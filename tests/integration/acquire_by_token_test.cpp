@@ -1,14 +1,20 @@
-// Tokens on the strength of another one: plain, handed on, and on behalf of somebody.
+// Tokens acquired with another token: plain, delegated, and on behalf of another user.
+#include <memory>
+#include <set>
+#include <string>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
 
 class AcquireByTokenTest : public HolderOfKeyTest {
  protected:
@@ -25,11 +31,6 @@ class AcquireByTokenTest : public HolderOfKeyTest {
     spec.actAsToken = std::move(token);
     return spec;
   }
-  static std::shared_ptr<const SamlToken> DelegableBearer() {
-    TokenSpec spec = Bearer();
-    spec.delegable = true;
-    return Acquire(spec);
-  }
   static std::shared_ptr<const SamlToken> MachineToken() {
     return HolderService()->AcquireTokenByCertificate(RenewableAndDelegable());
   }
@@ -44,7 +45,7 @@ TEST_F(AcquireByTokenTest, GivesANewTokenOfTheSameSubjectAndKey) {
   EXPECT_THAT(ChainOf(*second), IsEmpty());
 }
 
-TEST_F(AcquireByTokenTest, GivesABearerTokenIfAskedFor) {
+TEST_F(AcquireByTokenTest, GivesABearerTokenIfRequested) {
   const auto token = ByToken(*AcquireBound(), Bearer());
   EXPECT_EQ(token->Subject().name, "alice");
   EXPECT_EQ(token->ConfirmationType(), BEARER);
@@ -98,7 +99,7 @@ TEST_F(AcquireByTokenTest, ActsForTheSubjectOfABearerToken) {
   EXPECT_TRUE(IsBoundTo(*token, Holder()));
 }
 
-TEST_F(AcquireByTokenTest, ActsForTheSubjectAndHandsItOn) {
+TEST_F(AcquireByTokenTest, ActsForTheSubjectAndDelegates) {
   TokenSpec spec = OnBehalfOf(DelegableBearer());
   spec.delegateTo = std::string("bob@EXAMPLE.COM");
   const auto token = ByToken(*MachineToken(), spec);
@@ -106,13 +107,13 @@ TEST_F(AcquireByTokenTest, ActsForTheSubjectAndHandsItOn) {
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine", "bob"));
 }
 
-TEST_F(AcquireByTokenTest, ADelegateActsWithoutStandingInTheChainTwice) {
+TEST_F(AcquireByTokenTest, ADelegateActsWithoutAppearingInTheChainTwice) {
   const auto delegated = Acquire(DelegatedTo("machine@EXAMPLE.COM"));
   const auto token = ByToken(*MachineToken(), OnBehalfOf(delegated));
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine"));
 }
 
-TEST_F(AcquireByTokenTest, ABoundTokenIsActedForAsWell) {
+TEST_F(AcquireByTokenTest, AHolderOfKeyTokenMayBeTheActAsToken) {
   const auto token = ByToken(*MachineToken(), OnBehalfOf(AcquireBound()));
   EXPECT_EQ(token->Subject().name, "alice");
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine"));
@@ -124,11 +125,11 @@ TEST_F(AcquireByTokenTest, NobodyActsForASubjectThatDidNotAllowIt) {
   EXPECT_THAT(Sts().LastRequest().answeredFault, HasSubstr("may not be delegated to machine@"));
 }
 
-// What was delegated in an earlier life of a token stays with it when it is renewed.
+// A renewed token keeps the delegations of the token before it.
 TEST_F(AcquireByTokenTest, RenewalKeepsTheChain) {
   const auto delegated = ByToken(*AcquireBound(), DelegatedTo("bob@EXAMPLE.COM"));
   EXPECT_THAT(ChainOf(*HolderService()->RenewToken(*delegated, 60)), ElementsAre("bob"));
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

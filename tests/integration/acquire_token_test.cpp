@@ -1,12 +1,17 @@
+#include <cstddef>
+#include <set>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::HasSubstr;
+using testing::ElementsAre;
+using testing::HasSubstr;
 
 class AcquireTokenTest : public StsTest {};
 
@@ -38,7 +43,7 @@ TEST_F(AcquireTokenTest, WorksOverPlainHttpWithoutTlsTrust) {
   EXPECT_EQ(token->Subject().name, "alice");
 }
 
-TEST_F(AcquireTokenTest, TokenCarriesNamesAndGroupsOfTheSubject) {
+TEST_F(AcquireTokenTest, TokenHasNamesAndGroupsOfTheSubject) {
   const auto token = Acquire();
   SubjectNames names;
   token->GetSubjectNames(names);
@@ -116,7 +121,7 @@ TEST_F(AcquireTokenTest, MarkupAndForeignLettersReachTheServiceUnchanged) {
   EXPECT_EQ(token->Subject().name, "j\xC3\xBCrgen&co");
 }
 
-TEST_F(AcquireTokenTest, RequestIsTheStatedPost) {
+TEST_F(AcquireTokenTest, RequestIsTheExpectedPost) {
   Acquire();
   const auto request = Sts().LastRequest();
   EXPECT_EQ(request.method, "POST");
@@ -138,7 +143,7 @@ TEST_F(AcquireTokenTest, PathAndQueryOfTheUrlAreTheRequestTarget) {
   EXPECT_EQ(Sts().LastRequest().target, "/path/to/sts?tenant=one");
 }
 
-TEST_F(AcquireTokenTest, SslPeerNameStandsForTheHost) {
+TEST_F(AcquireTokenTest, SslPeerNameReplacesTheHost) {
   SecurityTokenServiceConfig config;
   const auto sslContext = TrustCa(Sts());
   config.url = Sts().HttpsUrl();
@@ -156,7 +161,7 @@ struct SigningCase {
   DevSts::KeyType key;
 };
 
-class SigningAlgorithmTest : public ::testing::TestWithParam<SigningCase> {};
+class SigningAlgorithmTest : public testing::TestWithParam<SigningCase> {};
 
 TEST_P(SigningAlgorithmTest, TokenIsAccepted) {
   DevSts::ServerOptions options;
@@ -174,18 +179,18 @@ using DevSts::KeyType;
 using DevSts::SignatureAlgorithm;
 
 INSTANTIATE_TEST_SUITE_P(Algorithms, SigningAlgorithmTest,
-                         ::testing::Values(SigningCase{"Rsa256", SignatureAlgorithm::RsaSha256,
-                                                       DigestAlgorithm::Sha256, KeyType::Rsa2048},
-                                           SigningCase{"Rsa384", SignatureAlgorithm::RsaSha384,
-                                                       DigestAlgorithm::Sha384, KeyType::Rsa2048},
-                                           SigningCase{"Rsa512", SignatureAlgorithm::RsaSha512,
-                                                       DigestAlgorithm::Sha512, KeyType::Rsa3072},
-                                           SigningCase{"Pss256", SignatureAlgorithm::RsaPssSha256,
-                                                       DigestAlgorithm::Sha256, KeyType::Rsa2048},
-                                           SigningCase{"Ecdsa256", SignatureAlgorithm::EcdsaSha256,
-                                                       DigestAlgorithm::Sha256, KeyType::EcP256},
-                                           SigningCase{"Ecdsa384", SignatureAlgorithm::EcdsaSha384,
-                                                       DigestAlgorithm::Sha384, KeyType::EcP384}),
+                         testing::Values(SigningCase{"Rsa256", SignatureAlgorithm::RsaSha256,
+                                                     DigestAlgorithm::Sha256, KeyType::Rsa2048},
+                                         SigningCase{"Rsa384", SignatureAlgorithm::RsaSha384,
+                                                     DigestAlgorithm::Sha384, KeyType::Rsa2048},
+                                         SigningCase{"Rsa512", SignatureAlgorithm::RsaSha512,
+                                                     DigestAlgorithm::Sha512, KeyType::Rsa3072},
+                                         SigningCase{"Pss256", SignatureAlgorithm::RsaPssSha256,
+                                                     DigestAlgorithm::Sha256, KeyType::Rsa2048},
+                                         SigningCase{"Ecdsa256", SignatureAlgorithm::EcdsaSha256,
+                                                     DigestAlgorithm::Sha256, KeyType::EcP256},
+                                         SigningCase{"Ecdsa384", SignatureAlgorithm::EcdsaSha384,
+                                                     DigestAlgorithm::Sha384, KeyType::EcP384}),
                          [](const auto& tested) { return tested.param.name; });
 
 class AnswerShapeTest : public StsTest {};
@@ -229,4 +234,4 @@ TEST_F(AnswerShapeTest, ChunkedAnswersOfAnyChunkSizeAreAccepted) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,14 +1,21 @@
-// Answers that belong to another operation, and answers that were changed on their way.
-#include <gmock/gmock.h>
+// Answers that belong to another operation, and answers that were changed in transit.
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <tuple>
+#include <typeinfo>
+
+#include <gtest/gtest.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 class AnswerConfusionTest : public HolderOfKeyTest,
-                            public ::testing::WithParamInterface<std::tuple<Operation, Operation>> {
+                            public testing::WithParamInterface<std::tuple<Operation, Operation>> {
  protected:
   /// The service's genuine answer.
   static std::string AnswerTo(Operation operation, const Arguments& arguments) {
@@ -21,7 +28,7 @@ class AnswerConfusionTest : public HolderOfKeyTest,
   }
 };
 
-// Of the four operations that bring a token, three are answered in the same way.
+// Three of the four operations that return a token have the same kind of answer.
 bool IsAnsweredAlike(Operation one, Operation other) {
   const auto issues = [](Operation operation) {
     return operation != Operation::Renew && operation != Operation::Validate;
@@ -48,8 +55,8 @@ TEST_P(AnswerConfusionTest, OnlyAnAnswerOfItsKindIsTaken) {
 }
 
 INSTANTIATE_TEST_SUITE_P(EveryPair, AnswerConfusionTest,
-                         ::testing::Combine(::testing::ValuesIn(kOperations),
-                                            ::testing::ValuesIn(kOperations)),
+                         testing::Combine(testing::ValuesIn(kOperations),
+                                          testing::ValuesIn(kOperations)),
                          [](const auto& tested) {
                            return std::string(NameOf(std::get<0>(tested.param))) + "AnsweredAs" +
                                   NameOf(std::get<1>(tested.param));
@@ -60,11 +67,10 @@ struct VerdictCase {
   const char* code;
 };
 
-class VerdictTextTest : public HolderOfKeyTest,
-                        public ::testing::WithParamInterface<VerdictCase> {};
+class VerdictTextTest : public HolderOfKeyTest, public testing::WithParamInterface<VerdictCase> {};
 
-// A verdict is one of two URIs as they stand; whatever resembles one is none.
-TEST_P(VerdictTextTest, IsNoVerdict) {
+// A verdict is exactly one of two URIs; anything similar is not a verdict.
+TEST_P(VerdictTextTest, IsNotAVerdict) {
   Arguments arguments;
   arguments.token = AcquireBound();
   DevSts::Misbehavior misbehavior;
@@ -82,7 +88,7 @@ TEST_P(VerdictTextTest, IsNoVerdict) {
 
 INSTANTIATE_TEST_SUITE_P(
     Codes, VerdictTextTest,
-    ::testing::Values(
+    testing::Values(
         VerdictCase{"Empty", ""}, VerdictCase{"Bare", "valid"},
         VerdictCase{"OtherCase", "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/Valid"},
         VerdictCase{"Blank", " http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid"},
@@ -93,4 +99,4 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

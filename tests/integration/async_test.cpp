@@ -1,17 +1,23 @@
-#include <gmock/gmock.h>
-
 #include <atomic>
+#include <chrono>
+#include <functional>
 #include <future>
+#include <memory>
+#include <string>
 #include <thread>
+#include <typeinfo>
+#include <vector>
+
+#include <gtest/gtest.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 class AsyncTest : public StsTest {};
 
-/// What a callback received, kept beyond the call.
+/// What a callback received, kept after the call.
 struct Outcome {
   std::shared_ptr<const SamlToken> token;
   std::unique_ptr<Tarnik::Throwable> error;
@@ -53,7 +59,7 @@ TEST_F(AsyncTest, FailureReachesTheCallbackWithItsExactClass) {
 }
 
 TEST_F(AsyncTest, ArgumentErrorsReachTheCallbackToo) {
-  // Shared, here and below: the callback may still be leaving when the result is here.
+  // Shared, here and below: the callback may not have returned yet when the result is available.
   const auto promise = std::make_shared<std::promise<std::string>>();
   Service()->AcquireTokenAsync(
       kUser, kPassword, TokenSpec{},
@@ -147,4 +153,4 @@ TEST_F(AsyncTest, ConcurrentSynchronousCallsAllComplete) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

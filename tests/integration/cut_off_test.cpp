@@ -1,8 +1,11 @@
-#include <gmock/gmock.h>
+#include <cstddef>
+#include <memory>
+
+#include <gtest/gtest.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 class CutOffTest : public StsTest {
@@ -11,7 +14,7 @@ class CutOffTest : public StsTest {
     return MakeService(Sts(), Sts().HttpUrl());
   }
 
-  // Every cut of the answer must be a failure of the exchange, whatever of it arrived.
+  // Every truncated answer must fail the exchange, however much of it arrived.
   static void ExpectRefusedAt(const SecurityTokenService& service, std::size_t offset,
                               DevSts::CutStyle style) {
     DevSts::Misbehavior cut;
@@ -21,7 +24,7 @@ class CutOffTest : public StsTest {
         << "cut after " << offset << " bytes";
   }
 
-  // Octets of the answer's head and body, at least: the token's text lies within.
+  // A lower bound of the length of the answer, which includes the token's text.
   static std::size_t AnswerLength() { return Acquire()->Xml().size(); }
 };
 
@@ -61,11 +64,11 @@ TEST_F(CutOffTest, AnswerWithoutLengthCutWithoutNoticeIsRefused) {
   EXPECT_THROW(Acquire(), CommunicationException);
 }
 
-TEST_F(CutOffTest, ServiceGoesOnAfterwards) {
+TEST_F(CutOffTest, ServiceWorksAfterwards) {
   const auto service = Service();
   ExpectRefusedAt(*service, 100, DevSts::CutStyle::Reset);
   EXPECT_NE(service->AcquireToken(kUser, kPassword, TenMinutes()), nullptr);
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -4,11 +4,16 @@
 
 #include <chrono>
 #include <cstdio>
+#include <cstdlib>
 #include <fstream>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 class TemporaryFile {
@@ -29,7 +34,7 @@ class TemporaryFile {
   std::string path_;
 };
 
-/// Runs the program and returns what waitpid tells of its end.
+/// Runs the program and returns the status from waitpid.
 int RunToEnd(std::vector<std::string> command) {
   std::vector<char*> arguments;
   for (auto& word : command) {
@@ -73,4 +78,4 @@ TEST_F(ExitTest, ProcessMayExitWhileTheServiceIsSilent) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,21 +1,36 @@
-// The asynchronous twins of all operations.
+// The asynchronous variants of all operations.
+#include <atomic>
+#include <chrono>
+#include <functional>
+#include <future>
+#include <iterator>
+#include <map>
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <thread>
+#include <tuple>
+#include <typeindex>
+#include <typeinfo>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <tarnik/crypto/crypto_exception.h>
 
-#include <map>
-#include <thread>
-
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::StartsWith;
+using testing::StartsWith;
 
 constexpr std::chrono::seconds kPatience{120};
 
-/// What came, or a failure if nothing does.
+/// The outcome; throws if none arrives in time.
 Outcome Await(std::future<Outcome>& future) {
   if (future.wait_for(kPatience) != std::future_status::ready) {
     throw std::runtime_error("the callback was never called");
@@ -30,7 +45,7 @@ Outcome AwaitCall(Operation operation, const SecurityTokenService& service,
 }
 
 class EveryOperationAsyncTest : public HolderOfKeyTest,
-                                public ::testing::WithParamInterface<Operation> {
+                                public testing::WithParamInterface<Operation> {
  protected:
   static Arguments WithToken() {
     Arguments arguments;
@@ -65,7 +80,7 @@ TEST_P(EveryOperationAsyncTest, ServiceMayBeReleasedBeforeTheCallEnds) {
   ExpectSuccess(Await(future));
 }
 
-TEST_P(EveryOperationAsyncTest, SpecIsCopiedAndOnlyTheTokenStaysTheCallers) {
+TEST_P(EveryOperationAsyncTest, SpecIsCopiedButNotTheToken) {
   const auto service = HolderService();
   Arguments arguments = WithToken();
   DevSts::Misbehavior slow;
@@ -102,33 +117,24 @@ TEST_P(EveryOperationAsyncTest, EmptyCallbackIsRefusedAtTheCall) {
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
-INSTANTIATE_TEST_SUITE_P(Operations, EveryOperationAsyncTest, ::testing::ValuesIn(kOperations),
+INSTANTIATE_TEST_SUITE_P(Operations, EveryOperationAsyncTest, testing::ValuesIn(kOperations),
                          [](const auto& tested) { return NameOf(tested.param); });
 
-/// Something that goes wrong.
+/// One way to fail.
 struct Trouble {
   const char* name;
   std::type_index errorClass;
   /// How the message begins; the rest is compared with that of the synchronous operation.
   const char* message;
   void (*prepare)(DevSts::Server& server, Arguments& arguments);
-  /// Operations that it does not concern succeed.
+  /// Operations that it does not affect succeed.
   bool concernsVerdicts = true;
   bool concernsRenewal = true;
 };
 
-void Replace(std::string& text, const std::string& what, const std::string& by) {
-  const auto at = text.find(what);
-  if (at == std::string::npos) {
-    throw std::runtime_error("nothing to replace: " + what);
-  }
-  text.replace(at, what.size(), by);
-}
-
 void AnswerFault(DevSts::Server& server, const char* code, const char* text) {
   DevSts::Misbehavior misbehavior;
-  misbehavior.fault = DevSts::FaultAnswer{"http://docs.oasis-open.org/ws-sx/ws-trust/200512", code,
-                                          text, false, 500};
+  misbehavior.fault = DevSts::FaultAnswer{kTrust, code, text, false, 500};
   server.SetMisbehavior(misbehavior);
 }
 
@@ -138,7 +144,7 @@ void EditTokens(DevSts::Server& server, std::function<void(std::string&)> edit) 
   server.SetAssertionOptions(options);
 }
 
-/// Puts another text in the place of the certificate that a token is bound to.
+/// Replaces the certificate that a token is bound to with another text.
 void EditHolderCertificate(DevSts::Server& server, const std::string& text) {
   EditTokens(server, [text](std::string& xml) {
     constexpr std::string_view kElement = "<ds:X509Certificate>";
@@ -148,7 +154,7 @@ void EditHolderCertificate(DevSts::Server& server, const std::string& text) {
 }
 
 class TroubleAsyncTest : public HolderOfKeyTest,
-                         public ::testing::WithParamInterface<std::tuple<Operation, Trouble>> {};
+                         public testing::WithParamInterface<std::tuple<Operation, Trouble>> {};
 
 TEST_P(TroubleAsyncTest, ArrivesAsTheSynchronousOperationThrowsIt) {
   const auto& [operation, trouble] = GetParam();
@@ -231,8 +237,8 @@ std::vector<Trouble> Troubles() {
 }
 
 INSTANTIATE_TEST_SUITE_P(EveryOperation, TroubleAsyncTest,
-                         ::testing::Combine(::testing::ValuesIn(kOperations),
-                                            ::testing::ValuesIn(Troubles())),
+                         testing::Combine(testing::ValuesIn(kOperations),
+                                          testing::ValuesIn(Troubles())),
                          [](const auto& tested) {
                            return std::string(NameOf(std::get<0>(tested.param))) +
                                   std::get<1>(tested.param).name;
@@ -265,7 +271,7 @@ TEST_F(HolderOfKeyAsyncTest, InvalidStateReachesTheCallback) {
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
-TEST_F(HolderOfKeyAsyncTest, VerdictThatATokenIsNotValidIsNoError) {
+TEST_F(HolderOfKeyAsyncTest, VerdictThatATokenIsNotValidIsNotAnError) {
   Arguments arguments;
   arguments.token = AcquireBound();
   Sts().Revoke(arguments.token->Id());
@@ -286,7 +292,7 @@ TEST_F(HolderOfKeyAsyncTest, ThousandMixedCallsInFlightAllComplete) {
   std::vector<std::future<Outcome>> futures;
   futures.reserve(kCalls);
   for (int i = 0; i < kCalls; ++i) {
-    // Every twentieth is an error before it is sent, or a refusal of the service.
+    // Every twentieth call fails before it is sent, and every twentieth is refused by the service.
     Arguments changed = arguments;
     changed.password = i % 20 == 0 ? "wrong-secret" : kPassword;
     changed.spec.tokenLifetimeSec = i % 20 == 1 ? 0 : 600;
@@ -333,4 +339,4 @@ TEST_F(HolderOfKeyAsyncTest, ThreadsShareOneServiceAndOneToken) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

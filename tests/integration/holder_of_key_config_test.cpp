@@ -1,16 +1,22 @@
-// Configurations that cannot work, told when a service is made or when it is to sign.
+// Unusable configurations, reported when a service is created or when it signs.
+#include <chrono>
+#include <memory>
+#include <string>
+#include <typeinfo>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "support/holder_of_key.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 using std::chrono::hours;
 using std::chrono::seconds;
-using ::testing::IsEmpty;
-using ::testing::SizeIs;
+using testing::IsEmpty;
+using testing::SizeIs;
 
 struct BrokenCase {
   const char* name;
@@ -51,8 +57,7 @@ HolderOfKeyConfig OfType() {
   return ConfigOf(CredentialOf(type));
 }
 
-class BrokenConfigTest : public HolderOfKeyTest,
-                         public ::testing::WithParamInterface<BrokenCase> {};
+class BrokenConfigTest : public HolderOfKeyTest, public testing::WithParamInterface<BrokenCase> {};
 
 TEST_P(BrokenConfigTest, IsRefusedWhenTheServiceIsMade) {
   const auto sslContext = TrustCa(Sts());
@@ -84,18 +89,18 @@ constexpr char kNotTheCertificates[] =
 
 INSTANTIATE_TEST_SUITE_P(
     Configs, BrokenConfigTest,
-    ::testing::Values(BrokenCase{"Empty", [] { return HolderOfKeyConfig(); },
-                                 "HolderOfKeyConfig: the certificate must not be null."},
-                      BrokenCase{"WithoutCertificate", WithoutCertificate,
-                                 "HolderOfKeyConfig: the certificate must not be null."},
-                      BrokenCase{"WithoutKey", WithoutKey,
-                                 "HolderOfKeyConfig: the private key must not be null."},
-                      BrokenCase{"Mismatched", Mismatched, kNotTheCertificates},
-                      BrokenCase{"MismatchedInKind", MismatchedInKind, kNotTheCertificates},
-                      BrokenCase{"EcP256", OfType<DevSts::KeyType::EcP256>, kNotRsa},
-                      BrokenCase{"EcP384", OfType<DevSts::KeyType::EcP384>, kNotRsa},
-                      BrokenCase{"Rsa1024", OfType<DevSts::KeyType::Rsa1024>,
-                                 "HolderOfKeyConfig: the RSA key must have at least 2048 bits."}),
+    testing::Values(BrokenCase{"Empty", [] { return HolderOfKeyConfig(); },
+                               "HolderOfKeyConfig: the certificate must not be null."},
+                    BrokenCase{"WithoutCertificate", WithoutCertificate,
+                               "HolderOfKeyConfig: the certificate must not be null."},
+                    BrokenCase{"WithoutKey", WithoutKey,
+                               "HolderOfKeyConfig: the private key must not be null."},
+                    BrokenCase{"Mismatched", Mismatched, kNotTheCertificates},
+                    BrokenCase{"MismatchedInKind", MismatchedInKind, kNotTheCertificates},
+                    BrokenCase{"EcP256", OfType<DevSts::KeyType::EcP256>, kNotRsa},
+                    BrokenCase{"EcP384", OfType<DevSts::KeyType::EcP384>, kNotRsa},
+                    BrokenCase{"Rsa1024", OfType<DevSts::KeyType::Rsa1024>,
+                               "HolderOfKeyConfig: the RSA key must have at least 2048 bits."}),
     [](const auto& tested) { return tested.param.name; });
 
 class HolderOfKeyConfigTest : public HolderOfKeyTest {};
@@ -115,7 +120,7 @@ struct PeriodCase {
 };
 
 class CertificatePeriodTest : public HolderOfKeyTest,
-                              public ::testing::WithParamInterface<PeriodCase> {
+                              public testing::WithParamInterface<PeriodCase> {
  protected:
   CertificatePeriodTest()
       : credential_(HolderValidBetween(GetParam().notBefore, GetParam().notAfter)),
@@ -146,7 +151,7 @@ TEST_P(OutOfPeriodTest, FailsEverySignatureAndSendsNothing) {
   EXPECT_THAT(Sts().Requests(), IsEmpty());
 }
 
-TEST_P(OutOfPeriodTest, DoesNotHinderWhatIsNotSigned) {
+TEST_P(OutOfPeriodTest, DoesNotAffectUnsignedRequests) {
   EXPECT_EQ(CallNow(Operation::Validate, *service_, arguments_).verdict, true);
   arguments_.spec.confirmation = CONFIRMATION_BEARER;
   const Outcome outcome = CallNow(Operation::Password, *service_, arguments_);
@@ -156,13 +161,13 @@ TEST_P(OutOfPeriodTest, DoesNotHinderWhatIsNotSigned) {
 
 INSTANTIATE_TEST_SUITE_P(
     Periods, OutOfPeriodTest,
-    ::testing::Values(PeriodCase{"LongExpired", hours(-48), hours(-24), "expired at "},
-                      PeriodCase{"JustExpired", hours(-1), seconds(-630), "expired at "},
-                      PeriodCase{"FarAhead", hours(24), hours(48), "is not valid before "},
-                      PeriodCase{"JustAhead", seconds(660), hours(1), "is not valid before "}),
+    testing::Values(PeriodCase{"LongExpired", hours(-48), hours(-24), "expired at "},
+                    PeriodCase{"JustExpired", hours(-1), seconds(-630), "expired at "},
+                    PeriodCase{"FarAhead", hours(24), hours(48), "is not valid before "},
+                    PeriodCase{"JustAhead", seconds(660), hours(1), "is not valid before "}),
     [](const auto& tested) { return tested.param.name; });
 
-// Clocks differ, so the service has the last word shortly before and after.
+// Clocks differ, so shortly before and after the period the service decides.
 class NearPeriodTest : public CertificatePeriodTest {};
 
 TEST_P(NearPeriodTest, IsLeftToTheService) {
@@ -177,9 +182,9 @@ TEST_P(NearPeriodTest, IsLeftToTheService) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Periods, NearPeriodTest,
-                         ::testing::Values(PeriodCase{"Expired", hours(-1), seconds(-540), ""},
-                                           PeriodCase{"Ahead", seconds(540), hours(1), ""}),
+                         testing::Values(PeriodCase{"Expired", hours(-1), seconds(-540), ""},
+                                         PeriodCase{"Ahead", seconds(540), hours(1), ""}),
                          [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,15 +1,24 @@
-// What the service refuses of a holder-of-key operation, as the caller sees it.
+// How refusals of holder-of-key operations by the service reach the caller.
+#include <chrono>
+#include <memory>
+#include <optional>
+#include <string>
+#include <typeindex>
+#include <typeinfo>
+#include <utility>
+
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 using std::chrono::seconds;
-using ::testing::StartsWith;
+using testing::StartsWith;
 
 class HolderOfKeyFaultTest : public HolderOfKeyTest {
  protected:
@@ -19,7 +28,7 @@ class HolderOfKeyFaultTest : public HolderOfKeyTest {
     EXPECT_EQ(outcome.message, message);
     EXPECT_EQ(outcome.token, nullptr);
   }
-  /// The service tells why in its fault, and the caller reads it.
+  /// The service gives the reason in its fault, and the caller sees it.
   static void ExpectRejected(const Outcome& outcome, const std::string& fault) {
     ExpectFailure(outcome, typeid(InvalidCredentialsException), "Authentication failed: " + fault);
   }
@@ -42,12 +51,12 @@ class HolderOfKeyFaultTest : public HolderOfKeyTest {
   }
 };
 
-TEST_F(HolderOfKeyFaultTest, UnknownCertificateIsNobodys) {
+TEST_F(HolderOfKeyFaultTest, UnknownCertificateIsRefused) {
   ExpectRejected(CallNow(Operation::Certificate, *HolderService(Stranger()), {}),
                  "The certificate belongs to no user");
 }
 
-TEST_F(HolderOfKeyFaultTest, ProvenKeyDoesNotStandForThePassword) {
+TEST_F(HolderOfKeyFaultTest, ProvenKeyDoesNotReplaceThePassword) {
   Arguments arguments;
   arguments.password = "wrong-secret";
   ExpectRejected(CallNow(Operation::Password, *HolderService(), arguments), "Invalid credentials");
@@ -68,7 +77,7 @@ struct PresentedCase {
 };
 
 class PresentedTokenFaultTest : public HolderOfKeyFaultTest,
-                                public ::testing::WithParamInterface<PresentedCase> {
+                                public testing::WithParamInterface<PresentedCase> {
  protected:
   static Operation Presenting() { return GetParam().operation; }
   static std::string Place() { return GetParam().place; }
@@ -103,9 +112,7 @@ TEST_P(PresentedTokenFaultTest, TokenThatTheServiceForgotIsRefused) {
 
 TEST_P(PresentedTokenFaultTest, TokenThatAStrangerSignedIsRefused) {
   std::string xml = AcquireBound()->Xml();
-  constexpr std::string_view kEnd = "</ds:Signature>";
-  const auto from = xml.find("<ds:Signature ");
-  xml.erase(from, xml.find(kEnd) + kEnd.size() - from);
+  EraseSignature(xml);
   const DevSts::Credential stranger = Sts().StrangerCredential();
   xml = DevSts::SignXml(xml, stranger.privateKeyPem, stranger.certificatePem,
                         DevSts::AssertionOptions::DefaultSigning());
@@ -113,8 +120,8 @@ TEST_P(PresentedTokenFaultTest, TokenThatAStrangerSignedIsRefused) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Operations, PresentedTokenFaultTest,
-                         ::testing::Values(PresentedCase{Operation::Token, "The presented token"},
-                                           PresentedCase{Operation::Renew, "The RenewTarget"}),
+                         testing::Values(PresentedCase{Operation::Token, "The presented token"},
+                                         PresentedCase{Operation::Renew, "The RenewTarget"}),
                          [](const auto& tested) { return NameOf(tested.param.operation); });
 
 TEST_F(HolderOfKeyFaultTest, ExpiredTokenIsRefused) {
@@ -133,7 +140,7 @@ TEST_F(HolderOfKeyFaultTest, TokenThatHasNotBegunIsRefused) {
 
 TEST_F(HolderOfKeyFaultTest, AnotherKeyThanTheTokensIsRefused) {
   const auto token = AcquireBound();
-  // The token names the key to verify with, and the request is not signed by that one.
+  // The token names the verification key, and the request is signed with another one.
   ExpectUnexpectedFault(Present(Operation::Token, token, Stranger()), "wsse:FailedCheck");
   ExpectRejected(Present(Operation::Renew, token, Stranger()),
                  "The request is not signed by the key of the RenewTarget");
@@ -198,7 +205,7 @@ TEST_F(HolderOfKeyFaultTest, WhatIsNotDelegableIsNotDelegated) {
                         "wst:InvalidRequest");
 }
 
-/// A fault of any kind, as answered to each operation.
+/// A fault of any kind, returned to each operation.
 struct FaultCase {
   const char* name;
   const char* codeNamespace;
@@ -208,12 +215,7 @@ struct FaultCase {
   const char* message;
 };
 
-constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
-constexpr char kSecext[] =
-    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
-
-class AnyFaultTest : public HolderOfKeyFaultTest,
-                     public ::testing::WithParamInterface<FaultCase> {};
+class AnyFaultTest : public HolderOfKeyFaultTest, public testing::WithParamInterface<FaultCase> {};
 
 TEST_P(AnyFaultTest, IsTheSameExceptionFromEveryOperation) {
   Arguments arguments;
@@ -232,7 +234,7 @@ TEST_P(AnyFaultTest, IsTheSameExceptionFromEveryOperation) {
 
 INSTANTIATE_TEST_SUITE_P(
     Faults, AnyFaultTest,
-    ::testing::Values(
+    testing::Values(
         FaultCase{"FailedAuthentication", kTrust, "FailedAuthentication", "no",
                   typeid(InvalidCredentialsException), "Authentication failed: no"},
         FaultCase{"ExpiredPassword", kTrust, "FailedAuthentication",
@@ -250,4 +252,4 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,8 +1,15 @@
 #include "integration/holder_of_key_fixture.h"
 
+#include <chrono>
 #include <cstring>
+#include <ctime>
+#include <memory>
+#include <string>
+#include <vector>
 
-namespace SsoClient::Tests {
+#include "support/holder_of_key.h"
+
+namespace SsoClient::Testing {
 
 namespace {
 
@@ -44,21 +51,10 @@ DevSts::Credential HolderValidBetween(std::chrono::seconds notBefore,
   return DevSts::MakeCertificate(spec);
 }
 
-HolderOfKeyConfig ConfigOf(const DevSts::Credential& credential) {
-  return {Tarnik::Crypto::CreateCertificatesFromPem(credential.certificatePem).front(),
-          Tarnik::Crypto::CreatePrivateKeyFromPem(credential.privateKeyPem)};
-}
-
 std::shared_ptr<SecurityTokenService> MakeHolderService(const DevSts::Server& server,
                                                         const std::string& url,
                                                         const DevSts::Credential& credential) {
-  const auto sslContext = TrustCa(server);
-  SecurityTokenServiceConfig config;
-  config.url = url;
-  config.sslContext = sslContext.get();
-  config.tokenFactory = CreateSamlTokenFactory(TrustSigner(server.SigningCertificatePem()).get());
-  config.holderOfKeyConfig = ConfigOf(credential);
-  return CreateSecurityTokenService(config);
+  return MakeService(server, url, ConfigOf(credential));
 }
 
 TokenSpec RenewableAndDelegable() {
@@ -104,4 +100,4 @@ DevSts::AssertionOptions ValidBetween(std::chrono::seconds start, std::chrono::s
   return options;
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

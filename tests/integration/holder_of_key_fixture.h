@@ -1,30 +1,29 @@
-#ifndef TESTS_INTEGRATION_HOLDER_OF_KEY_FIXTURE_H
-#define TESTS_INTEGRATION_HOLDER_OF_KEY_FIXTURE_H
+#ifndef SSOCLIENT_TESTS_INTEGRATION_HOLDER_OF_KEY_FIXTURE_H
+#define SSOCLIENT_TESTS_INTEGRATION_HOLDER_OF_KEY_FIXTURE_H
 
-#include <devsts/certificates.h>
-
+#include <chrono>
 #include <memory>
 #include <string>
 #include <vector>
 
+#include <devsts/certificates.h>
+
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 
-/// A solution user of the dev STS, known by the certificate of `Holder()` too.
+/// A solution user of the dev STS, also known by the certificate of `Holder()`.
 inline constexpr char kMachine[] = "machine@EXAMPLE.COM";
 inline constexpr char kMachinePassword[] = "machine-secret";
 
 /// The client's RSA key and certificate.
 const DevSts::Credential& Holder();
-/// Others, which belong to nobody.
+/// Another key and certificate, which belong to no user.
 const DevSts::Credential& Stranger();
 
 /// A new RSA certificate of the key of `Holder()`, valid between these times from now.
 DevSts::Credential HolderValidBetween(std::chrono::seconds notBefore,
                                       std::chrono::seconds notAfter);
-
-HolderOfKeyConfig ConfigOf(const DevSts::Credential& credential);
 
 /// As `MakeService`, with the credential's holder-of-key configuration.
 std::shared_ptr<SecurityTokenService> MakeHolderService(const DevSts::Server& server,
@@ -43,7 +42,7 @@ std::vector<std::string> ChainOf(const SamlToken& token);
 /// True when the token is bound to the credential's certificate, octet for octet.
 bool IsBoundTo(const SamlToken& token, const DevSts::Credential& credential);
 
-/// Tokens of these options begin and end at these times from now, whatever is asked for.
+/// With these options tokens begin and end at these times from now, whatever is requested.
 DevSts::AssertionOptions ValidBetween(std::chrono::seconds start, std::chrono::seconds end);
 
 class HolderOfKeyTest : public StsTest {
@@ -59,8 +58,14 @@ class HolderOfKeyTest : public StsTest {
       const TokenSpec& spec = RenewableAndDelegable()) {
     return HolderService()->AcquireToken(kUser, kPassword, spec);
   }
+  /// A bearer token of `kUser` that may be delegated.
+  static std::shared_ptr<const SamlToken> DelegableBearer() {
+    TokenSpec spec = Bearer();
+    spec.delegable = true;
+    return Acquire(spec);
+  }
 };
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing
 
 #endif

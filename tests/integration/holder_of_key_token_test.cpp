@@ -1,13 +1,17 @@
 // Tokens bound to the client's key: by password and by certificate.
+#include <set>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using testing::ElementsAre;
+using testing::IsEmpty;
 
 class HolderOfKeyTokenTest : public HolderOfKeyTest {};
 
@@ -45,7 +49,7 @@ TEST_F(HolderOfKeyTokenTest, ByPasswordTheSpecReachesTheToken) {
   EXPECT_THAT(advice[0].attributes[0].values, ElementsAre("one", "two"));
 }
 
-TEST_F(HolderOfKeyTokenTest, ByPasswordIsABearerTokenIfAskedFor) {
+TEST_F(HolderOfKeyTokenTest, ByPasswordIsABearerTokenIfRequested) {
   const auto token = AcquireBound(Bearer());
   EXPECT_EQ(token->Subject().name, "alice");
   EXPECT_EQ(token->ConfirmationType(), BEARER);
@@ -104,4 +108,4 @@ TEST_F(HolderOfKeyTokenTest, RequestsOfOneServiceAreSignedAnewEachTime) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

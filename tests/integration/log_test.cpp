@@ -1,16 +1,19 @@
+#include <mutex>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <tarnik/service/log.h>
 
-#include <mutex>
-
 #include "integration/sts_fixture.h"
+#include "integration/text_edits.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::HasSubstr;
-using ::testing::Not;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::Not;
 
 struct Line {
   int level;
@@ -64,7 +67,7 @@ TEST_F(LogTest, FailureStillWritesTheEndLine) {
   EXPECT_EQ(lines_.back(), (Line{7, "END operation SecurityTokenServiceImpl::AcquireToken"}));
 }
 
-TEST_F(LogTest, LevelFiveShowsTheTokenAlone) {
+TEST_F(LogTest, LevelFiveShowsOnlyTheToken) {
   Tarnik::Service::SetLogLevel("SsoClient", 5);
   Acquire();
   ASSERT_EQ(lines_.size(), 1U);
@@ -91,17 +94,6 @@ TEST_F(LogTest, NoPasswordOrTokenTextInAnyLine) {
     EXPECT_THAT(line.text, Not(HasSubstr(token->Id())));
     EXPECT_THAT(line.text, Not(HasSubstr("SignatureValue")));
   }
-}
-
-void Replace(std::string& text, const std::string& what, const std::string& with) {
-  const auto at = text.find(what);
-  ASSERT_NE(at, std::string::npos) << what;
-  text.replace(at, what.size(), with);
-}
-
-std::string Between(const std::string& text, const std::string& start, const std::string& end) {
-  const auto from = text.find(start) + start.size();
-  return text.substr(from, text.find(end, from) - from);
 }
 
 TEST_F(LogTest, NoTokenTextInTheFailureOrTheLinesOfARefusedAnswer) {
@@ -144,4 +136,4 @@ TEST_F(LogTest, NoTokenTextInTheFailureOrTheLinesOfARefusedAnswer) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

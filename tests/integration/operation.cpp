@@ -1,10 +1,17 @@
 #include "integration/operation.h"
 
+#include <future>
+#include <memory>
+#include <optional>
 #include <ostream>
+#include <stdexcept>
+#include <type_traits>
 #include <typeinfo>
 #include <utility>
 
-namespace SsoClient::Tests {
+#include <gtest/gtest.h>
+
+namespace SsoClient::Testing {
 
 namespace {
 
@@ -71,7 +78,7 @@ Outcome CallNow(Operation operation, const SecurityTokenService& service,
 
 std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& service,
                                const Arguments& arguments) {
-  // Shared, since the callback may still be leaving when the outcome is here.
+  // Shared, since the callback may not have returned yet when the outcome is available.
   auto promise = std::make_shared<std::promise<Outcome>>();
   auto outcome = promise->get_future();
   const auto report = [promise, presented = arguments.token](const auto& result,
@@ -107,4 +114,4 @@ std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& 
   return outcome;
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

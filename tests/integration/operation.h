@@ -1,7 +1,5 @@
-#ifndef TESTS_INTEGRATION_OPERATION_H
-#define TESTS_INTEGRATION_OPERATION_H
-
-#include <ssoclient/ssoclient.h>
+#ifndef SSOCLIENT_TESTS_INTEGRATION_OPERATION_H
+#define SSOCLIENT_TESTS_INTEGRATION_OPERATION_H
 
 #include <future>
 #include <iosfwd>
@@ -9,12 +7,15 @@
 #include <optional>
 #include <string>
 #include <typeindex>
+#include <typeinfo>
+
+#include <ssoclient/ssoclient.h>
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 
-/// The operations of a service, for tests that are about all of them.
+/// The operations of a service, for tests of all of them.
 enum class Operation { Password, Certificate, Token, Renew, Validate };
 
 inline constexpr Operation kOperations[] = {Operation::Password, Operation::Certificate,
@@ -25,7 +26,7 @@ inline constexpr Operation kOperations[] = {Operation::Password, Operation::Cert
 const char* NameOf(Operation operation);
 std::ostream& operator<<(std::ostream& stream, Operation operation);
 
-/// Arguments for any operation, which takes its part of them. Renewal takes the spec's lifetime.
+/// Arguments for any operation; each uses the ones it needs. Renewal uses the spec's lifetime.
 struct Arguments {
   TokenSpec spec = TenMinutes();
   std::shared_ptr<const SamlToken> token;
@@ -47,10 +48,10 @@ struct Outcome {
 Outcome CallNow(Operation operation, const SecurityTokenService& service,
                 const Arguments& arguments);
 
-/// Starts the asynchronous twin. `arguments.token` stays alive until the callback has run.
+/// Starts the asynchronous operation. `arguments.token` stays alive until the callback has run.
 std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& service,
                                const Arguments& arguments);
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,21 +1,26 @@
-// What each operation writes into the log, and what never stands there.
-#include <gmock/gmock.h>
-
+// What each operation writes to the log, and what never appears there.
+#include <cstddef>
 #include <functional>
+#include <string>
+#include <tuple>
+#include <utility>
+#include <vector>
+
+#include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
-#include "integration/wire_request.h"
+#include "integration/text_edits.h"
 #include "sts/log_capture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::ElementsAreArray;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-using ::testing::Not;
+using testing::ElementsAre;
+using testing::ElementsAreArray;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
 
 constexpr char kSpecText[] =
     "TokenSpec [tokenLifetimeSec=600, delegable=false, delegateTo=<unset>, renewable=false, "
@@ -33,7 +38,7 @@ std::string Acquired(const Outcome& outcome) {
   return "5 Successfully acquired token: " + CreateSamlTokenDescription(*outcome.token);
 }
 
-/// The line that tells of the arguments.
+/// The line that describes the arguments.
 std::string RequestLine(Operation operation, const Arguments& arguments) {
   const std::string presented = CreateSamlTokenDescription(*arguments.token);
   const std::string spec = std::string("`") + kSpecText + "'";
@@ -52,7 +57,7 @@ std::string RequestLine(Operation operation, const Arguments& arguments) {
   return {};
 }
 
-class OperationLogTest : public HolderOfKeyTest, public ::testing::WithParamInterface<Operation> {
+class OperationLogTest : public HolderOfKeyTest, public testing::WithParamInterface<Operation> {
  protected:
   OperationLogTest() { arguments_.token = AcquireBound(); }
 
@@ -62,7 +67,7 @@ class OperationLogTest : public HolderOfKeyTest, public ::testing::WithParamInte
 TEST_P(OperationLogTest, SuccessWritesItsLinesInOrder) {
   const auto service = HolderService();
   for (const int level : {7, 9}) {
-    const Testing::LogCapture log(level);
+    const LogCapture log(level);
     const Outcome outcome = CallNow(GetParam(), *service, arguments_);
     ASSERT_TRUE(outcome.IsSuccess()) << outcome.message;
     std::vector<std::string> expected = {Started(GetParam()), RequestLine(GetParam(), arguments_)};
@@ -76,10 +81,10 @@ TEST_P(OperationLogTest, SuccessWritesItsLinesInOrder) {
   }
 }
 
-TEST_P(OperationLogTest, LevelsFiveAndSixTellOnlyOfAnAcquiredToken) {
+TEST_P(OperationLogTest, LevelsFiveAndSixLogOnlyAnAcquiredToken) {
   const auto service = HolderService();
   for (const int level : {5, 6}) {
-    const Testing::LogCapture log(level);
+    const LogCapture log(level);
     const Outcome outcome = CallNow(GetParam(), *service, arguments_);
     if (GetParam() == Operation::Validate) {
       EXPECT_THAT(log.Lines(), IsEmpty());
@@ -91,11 +96,10 @@ TEST_P(OperationLogTest, LevelsFiveAndSixTellOnlyOfAnAcquiredToken) {
 
 TEST_P(OperationLogTest, FailureOfTheServiceStillWritesTheEndLine) {
   DevSts::Misbehavior misbehavior;
-  misbehavior.fault = DevSts::FaultAnswer{"http://docs.oasis-open.org/ws-sx/ws-trust/200512",
-                                          "RequestFailed", "no", false, 500};
+  misbehavior.fault = DevSts::FaultAnswer{kTrust, "RequestFailed", "no", false, 500};
   Sts().SetMisbehavior(misbehavior);
   const auto service = HolderService();
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   EXPECT_FALSE(CallNow(GetParam(), *service, arguments_).IsSuccess());
   std::vector<std::string> expected = {Started(GetParam()), RequestLine(GetParam(), arguments_)};
   if (GetParam() == Operation::Password) {
@@ -113,7 +117,7 @@ TEST_P(OperationLogTest, LocalFailureStillWritesTheEndLine) {
   }
   arguments_.spec.tokenLifetimeSec = -1;
   const auto service = HolderService();
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   EXPECT_FALSE(CallNow(GetParam(), *service, arguments_).IsSuccess());
   const auto lines = log.Lines();
   ASSERT_EQ(lines.size(), 3U);
@@ -123,9 +127,9 @@ TEST_P(OperationLogTest, LocalFailureStillWritesTheEndLine) {
   EXPECT_EQ(lines.back(), Ended(GetParam()));
 }
 
-TEST_P(OperationLogTest, AsynchronousTwinWritesTheSameLines) {
+TEST_P(OperationLogTest, AsynchronousOperationWritesTheSameLines) {
   const auto service = HolderService();
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   ASSERT_TRUE(CallAsync(GetParam(), *service, arguments_).get().IsSuccess());
   const auto lines = log.Lines();
   EXPECT_EQ(lines.front(), Started(GetParam()));
@@ -135,7 +139,7 @@ TEST_P(OperationLogTest, AsynchronousTwinWritesTheSameLines) {
 
 TEST_P(OperationLogTest, ByDefaultSuccessAndFailureAreSilent) {
   const auto service = HolderService();
-  const Testing::LogCapture log(4);
+  const LogCapture log(4);
   EXPECT_TRUE(CallNow(GetParam(), *service, arguments_).IsSuccess());
   arguments_.token = Acquire();
   arguments_.password = "wrong-secret";
@@ -143,17 +147,8 @@ TEST_P(OperationLogTest, ByDefaultSuccessAndFailureAreSilent) {
   EXPECT_THAT(log.Lines(), IsEmpty());
 }
 
-std::string Between(const std::string& text, const std::string& start, const std::string& end) {
-  const auto from = text.find(start);
-  if (from == std::string::npos) {
-    throw std::runtime_error("not found: " + start);
-  }
-  const auto begin = from + start.size();
-  return text.substr(begin, text.find(end, begin) - begin);
-}
-
-/// Pieces of everything that must not be told: of the password, the private key, and of the text of
-/// every token that took part.
+/// Pieces of everything that must stay secret: the password, the private key and the text of every
+/// token that took part.
 std::vector<std::string> SecretsOf(const Arguments& arguments, const Outcome& outcome) {
   std::vector<std::string> secrets = {arguments.password, "PRIVATE KEY", "<saml2", "<wsse"};
   const std::string pem = Holder().privateKeyPem;
@@ -170,10 +165,10 @@ std::vector<std::string> SecretsOf(const Arguments& arguments, const Outcome& ou
   return secrets;
 }
 
-/// How an operation ends, where that is the same for all of them.
+/// How an operation ends, if that is the same for all of them.
 enum class End { Success, Failure, Either };
 
-/// What a request or an answer met on its way.
+/// What happens to a request or an answer in transit.
 struct Mishap {
   const char* name;
   End end;
@@ -181,7 +176,7 @@ struct Mishap {
 };
 
 class SecretLogTest : public HolderOfKeyTest,
-                      public ::testing::WithParamInterface<std::tuple<Operation, Mishap>> {};
+                      public testing::WithParamInterface<std::tuple<Operation, Mishap>> {};
 
 TEST_P(SecretLogTest, NoSecretInAnyLineOrMessage) {
   const auto& [operation, mishap] = GetParam();
@@ -201,7 +196,7 @@ TEST_P(SecretLogTest, NoSecretInAnyLineOrMessage) {
   const auto service = HolderService();
   mishap.prepare(Sts());
 
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   const Outcome outcome = CallNow(operation, *service, arguments);
   if (mishap.end != End::Either) {
     EXPECT_EQ(outcome.IsSuccess(), mishap.end == End::Success) << outcome.message;
@@ -264,21 +259,21 @@ void ForgetUsers(DevSts::Server& server) {
   server.SetUsers({});
 }
 
-INSTANTIATE_TEST_SUITE_P(Operations, OperationLogTest, ::testing::ValuesIn(kOperations),
+INSTANTIATE_TEST_SUITE_P(Operations, OperationLogTest, testing::ValuesIn(kOperations),
                          [](const auto& tested) { return NameOf(tested.param); });
 
 INSTANTIATE_TEST_SUITE_P(
     Operations, SecretLogTest,
-    ::testing::Combine(::testing::ValuesIn(kOperations),
-                       ::testing::Values(Mishap{"Success", End::Success, [](DevSts::Server&) {}},
-                                         Mishap{"CutOff", End::Failure, CutOff},
-                                         Mishap{"Halved", End::Failure, Halve},
-                                         Mishap{"Malformed", End::Either, Rename},
-                                         Mishap{"Falsified", End::Either, Falsify},
-                                         Mishap{"Refused", End::Either, ForgetUsers})),
+    testing::Combine(testing::ValuesIn(kOperations),
+                     testing::Values(Mishap{"Success", End::Success, [](DevSts::Server&) {}},
+                                     Mishap{"CutOff", End::Failure, CutOff},
+                                     Mishap{"Halved", End::Failure, Halve},
+                                     Mishap{"Malformed", End::Either, Rename},
+                                     Mishap{"Falsified", End::Either, Falsify},
+                                     Mishap{"Refused", End::Either, ForgetUsers})),
     [](const auto& tested) {
       return std::string(NameOf(std::get<0>(tested.param))) + std::get<1>(tested.param).name;
     });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,20 +1,18 @@
-#include <gmock/gmock.h>
-
 #include <netinet/in.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <string>
+
+#include <gmock/gmock.h>
+
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::HasSubstr;
-using ::testing::StartsWith;
-
-constexpr char kTrust[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
-constexpr char kSecext[] =
-    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
+using testing::HasSubstr;
+using testing::StartsWith;
 
 class RefusalTest : public StsTest {
  protected:
@@ -35,14 +33,14 @@ TEST_F(RefusalTest, UnknownUserIsInvalidCredentials) {
   EXPECT_EQ(message, "Authentication failed: Invalid credentials");
 }
 
-TEST_F(RefusalTest, ExpiredPasswordIsToldApart) {
+TEST_F(RefusalTest, ExpiredPasswordHasItsOwnException) {
   const std::string message = MessageOf<PasswordExpiredException>(
       [] { Service()->AcquireToken("expired@EXAMPLE.COM", "expired-secret", TenMinutes()); });
   EXPECT_THAT(message,
               StartsWith("Authentication failed: Password of the user logging on is expired"));
 }
 
-TEST_F(RefusalTest, ExpiryTextBehindOtherWordsIsNotAnExpiredPassword) {
+TEST_F(RefusalTest, ExpiryTextAfterOtherWordsIsNotAnExpiredPassword) {
   DevSts::Misbehavior misbehavior;
   misbehavior.fault =
       DevSts::FaultAnswer{kTrust, "FailedAuthentication",
@@ -81,7 +79,7 @@ struct StatusCase {
   const char* reason;
 };
 
-class StatusTest : public RefusalTest, public ::testing::WithParamInterface<StatusCase> {};
+class StatusTest : public RefusalTest, public testing::WithParamInterface<StatusCase> {};
 
 TEST_P(StatusTest, IsNamedInTheMessageAndNothingIsFollowed) {
   DevSts::Misbehavior misbehavior;
@@ -97,13 +95,13 @@ TEST_P(StatusTest, IsNamedInTheMessageAndNothingIsFollowed) {
 
 INSTANTIATE_TEST_SUITE_P(
     Statuses, StatusTest,
-    ::testing::Values(StatusCase{404, "Not Found"}, StatusCase{503, "Service Unavailable"},
-                      StatusCase{301, "Moved Permanently"}, StatusCase{302, "Found"},
-                      StatusCase{303, "See Other"}, StatusCase{307, "Temporary Redirect"},
-                      StatusCase{308, "Permanent Redirect"}, StatusCase{300, "Multiple Choices"},
-                      StatusCase{401, "Unauthorized"}, StatusCase{502, "Bad Gateway"}));
+    testing::Values(StatusCase{404, "Not Found"}, StatusCase{503, "Service Unavailable"},
+                    StatusCase{301, "Moved Permanently"}, StatusCase{302, "Found"},
+                    StatusCase{303, "See Other"}, StatusCase{307, "Temporary Redirect"},
+                    StatusCase{308, "Permanent Redirect"}, StatusCase{300, "Multiple Choices"},
+                    StatusCase{401, "Unauthorized"}, StatusCase{502, "Bad Gateway"}));
 
-TEST_F(RefusalTest, GarbageInsteadOfXmlIsToldApart) {
+TEST_F(RefusalTest, GarbageInsteadOfXmlHasItsOwnMessage) {
   DevSts::Misbehavior misbehavior;
   misbehavior.httpAnswer = DevSts::HttpAnswer{200, "OK", {}, "this is no XML"};
   Sts().SetMisbehavior(misbehavior);
@@ -111,7 +109,7 @@ TEST_F(RefusalTest, GarbageInsteadOfXmlIsToldApart) {
               StartsWith("Response is not well-formed XML: "));
 }
 
-TEST_F(RefusalTest, XmlThatIsNoAnswerIsRefused) {
+TEST_F(RefusalTest, XmlThatIsNotAnAnswerIsRefused) {
   DevSts::Misbehavior misbehavior;
   misbehavior.httpAnswer = DevSts::HttpAnswer{200, "OK", {}, "<html><p/></html>"};
   Sts().SetMisbehavior(misbehavior);
@@ -128,7 +126,7 @@ TEST_F(RefusalTest, GarbageInsteadOfHttpIsACommunicationFailure) {
 }
 
 TEST_F(RefusalTest, NobodyListens) {
-  // A port that was free a moment ago and that nobody listens on.
+  // A port that was free a moment ago and that no process listens on.
   const int probe = socket(AF_INET, SOCK_STREAM, 0);
   sockaddr_in address{};
   address.sin_family = AF_INET;
@@ -191,7 +189,7 @@ struct UnsendableCase {
   std::string text;
 };
 
-class UnsendableTextTest : public StsTest, public ::testing::WithParamInterface<UnsendableCase> {};
+class UnsendableTextTest : public StsTest, public testing::WithParamInterface<UnsendableCase> {};
 
 TEST_P(UnsendableTextTest, IsRefusedBeforeAnythingIsSent) {
   const std::string& text = GetParam().text;
@@ -214,18 +212,18 @@ TEST_P(UnsendableTextTest, IsRefusedBeforeAnythingIsSent) {
   const std::string message = MessageOf<Tarnik::InvalidArgumentException>(
       [&] { service->AcquireToken(kUser, text, TenMinutes()); });
   EXPECT_THAT(message, HasSubstr("wsse:Password"));
-  EXPECT_THAT(message, ::testing::Not(HasSubstr("hush")));
+  EXPECT_THAT(message, testing::Not(HasSubstr("hush")));
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
 INSTANTIATE_TEST_SUITE_P(Texts, UnsendableTextTest,
-                         ::testing::Values(UnsendableCase{"Nul", std::string("hu\0sh", 5)},
-                                           UnsendableCase{"Control", "hush\x01"},
-                                           UnsendableCase{"BrokenUtf8", "hush\xC3"},
-                                           UnsendableCase{"OverlongUtf8", "hush\xC0\x80"},
-                                           UnsendableCase{"Surrogate", "hush\xED\xA0\x80"},
-                                           UnsendableCase{"Fffe", "hush\xEF\xBF\xBE"}),
+                         testing::Values(UnsendableCase{"Nul", std::string("hu\0sh", 5)},
+                                         UnsendableCase{"Control", "hush\x01"},
+                                         UnsendableCase{"BrokenUtf8", "hush\xC3"},
+                                         UnsendableCase{"OverlongUtf8", "hush\xC0\x80"},
+                                         UnsendableCase{"Surrogate", "hush\xED\xA0\x80"},
+                                         UnsendableCase{"Fffe", "hush\xEF\xBF\xBE"}),
                          [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

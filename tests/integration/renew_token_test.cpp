@@ -1,14 +1,20 @@
 // Renewal over real TLS.
+#include <chrono>
+#include <memory>
+#include <set>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 using std::chrono::seconds;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
+using testing::HasSubstr;
+using testing::IsEmpty;
 
 constexpr char kUnableToRenew[] = "Unexpected SOAP fault: wst:UnableToRenew; request failed.";
 
@@ -24,7 +30,7 @@ class RenewTokenTest : public HolderOfKeyTest {
   }
 };
 
-TEST_F(RenewTokenTest, GivesANewTokenForTheLifetimeThatIsAskedFor) {
+TEST_F(RenewTokenTest, GivesANewTokenForTheRequestedLifetime) {
   const auto token = AcquireBound();
   const auto renewed = Renew(*token, 7200);
   EXPECT_NE(renewed->Id(), token->Id());
@@ -34,7 +40,7 @@ TEST_F(RenewTokenTest, GivesANewTokenForTheLifetimeThatIsAskedFor) {
   EXPECT_EQ(lifetime, 7200L * 1'000'000);
 }
 
-TEST_F(RenewTokenTest, KeepsWhatTheTokenSays) {
+TEST_F(RenewTokenTest, KeepsTheContentOfTheToken) {
   TokenSpec spec = RenewableAndDelegable();
   spec.audienceRestriction = {"https://a.example"};
   spec.advice = {{"urn:source", {{"urn:attribute", {"value"}}}}};
@@ -55,7 +61,7 @@ TEST_F(RenewTokenTest, KeepsWhatTheTokenSays) {
   EXPECT_FALSE(after.empty());
 }
 
-TEST_F(RenewTokenTest, CountsDownUntilTheTokenMayNotBeRenewedAnyMore) {
+TEST_F(RenewTokenTest, CountsDownUntilTheTokenIsNoLongerRenewable) {
   DevSts::AssertionOptions options;
   options.renewCount = 3;
   Sts().SetAssertionOptions(options);
@@ -73,7 +79,7 @@ TEST_F(RenewTokenTest, TokenThatIsNotRenewableIsRefusedByTheService) {
   EXPECT_EQ(RefusalOf(*AcquireBound(TenMinutes())), "The RenewTarget is not renewable");
 }
 
-// The client asks for a lifetime that begins now, so this right is not used, but handed on.
+// The client requests a lifetime that begins now, so this right is not used, but passed on.
 TEST_F(RenewTokenTest, PostdatableTokenBeginsNowAndStaysPostdatable) {
   for (const bool postdatable : {false, true}) {
     DevSts::AssertionOptions options;
@@ -93,7 +99,7 @@ TEST_F(RenewTokenTest, TokenThatHasNotBegunIsRefused) {
   EXPECT_EQ(RefusalOf(*AcquireBound()), "The RenewTarget is not yet valid");
 }
 
-// Within the client's tolerance of ten minutes an expired token still is a token.
+// Within the client's tolerance of ten minutes an expired token is still accepted.
 TEST_F(RenewTokenTest, ExpiredTokenIsRenewedIfItsRestrictionSaysSo) {
   for (const bool renewExpired : {false, true}) {
     DevSts::AssertionOptions options = ValidBetween(seconds(-100), seconds(-10));
@@ -128,4 +134,4 @@ TEST_F(RenewTokenTest, NewCertificateOfTheSameKeyRenewsToo) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

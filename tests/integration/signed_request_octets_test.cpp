@@ -1,18 +1,26 @@
-// Signed requests as they arrive, judged by another implementation of XML signatures.
+// Signed requests as they arrive, verified by another implementation of XML signatures.
+#include <memory>
+#include <set>
+#include <string>
+#include <string_view>
+#include <tuple>
+#include <vector>
+
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 #include "integration/wire_request.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::StartsWith;
+using testing::ElementsAre;
+using testing::StartsWith;
 
-/// Where a text travels in a signed request.
+/// The place of a text in a signed request.
 enum class Place { UserName, Password, Audience, AdviceSource, AdviceName, AdviceValue, Delegate };
 
 struct TextCase {
@@ -26,7 +34,7 @@ struct PlaceCase {
 };
 
 class SignedTextTest : public HolderOfKeyTest,
-                       public ::testing::WithParamInterface<std::tuple<PlaceCase, TextCase>> {};
+                       public testing::WithParamInterface<std::tuple<PlaceCase, TextCase>> {};
 
 Arguments ArgumentsWith(Place place, const std::string& text) {
   Arguments arguments;
@@ -56,7 +64,7 @@ Arguments ArgumentsWith(Place place, const std::string& text) {
   return arguments;
 }
 
-/// The text as the issued token tells it, where it tells it.
+/// The text as the issued token returns it, if it does.
 std::string TextOf(Place place, const SamlToken& token, const Arguments& arguments) {
   std::set<std::string> audiences;
   token.GetAudiences(audiences);
@@ -82,7 +90,7 @@ std::string TextOf(Place place, const SamlToken& token, const Arguments& argumen
   return {};
 }
 
-// The request's own signature stands first in its envelope, unless an assertion stands in the
+// The request's own signature is the first in its envelope, unless there is an assertion in the
 // header.
 void ExpectVerifies(const std::string& body) {
   const DevSts::VerifyResult result = DevSts::VerifyXml(body, Holder().certificatePem);
@@ -91,12 +99,9 @@ void ExpectVerifies(const std::string& body) {
   EXPECT_FALSE(DevSts::VerifyXml(body, Stranger().certificatePem));
 }
 
-std::string Changed(std::string text, const std::string& what, const std::string& by) {
-  const auto at = text.find(what);
-  if (at == std::string::npos) {
-    throw std::runtime_error("nothing to change: " + what);
-  }
-  return text.replace(at, what.size(), by);
+std::string Changed(std::string text, std::string_view what, std::string_view by) {
+  Replace(text, what, by);
+  return text;
 }
 
 TEST_P(SignedTextTest, ArrivesUnchangedUnderASignatureThatVerifies) {
@@ -135,22 +140,24 @@ std::vector<TextCase> Texts() {
 
 INSTANTIATE_TEST_SUITE_P(
     EveryPlace, SignedTextTest,
-    ::testing::Combine(::testing::Values(PlaceCase{"UserName", Place::UserName},
-                                         PlaceCase{"Password", Place::Password},
-                                         PlaceCase{"Audience", Place::Audience},
-                                         PlaceCase{"AdviceSource", Place::AdviceSource},
-                                         PlaceCase{"AdviceName", Place::AdviceName},
-                                         PlaceCase{"AdviceValue", Place::AdviceValue},
-                                         PlaceCase{"Delegate", Place::Delegate}),
-                       ::testing::ValuesIn(Texts())),
+    testing::Combine(testing::Values(PlaceCase{"UserName", Place::UserName},
+                                     PlaceCase{"Password", Place::Password},
+                                     PlaceCase{"Audience", Place::Audience},
+                                     PlaceCase{"AdviceSource", Place::AdviceSource},
+                                     PlaceCase{"AdviceName", Place::AdviceName},
+                                     PlaceCase{"AdviceValue", Place::AdviceValue},
+                                     PlaceCase{"Delegate", Place::Delegate}),
+                     testing::ValuesIn(Texts())),
     [](const auto& tested) {
       return std::string(std::get<0>(tested.param).name) + std::get<1>(tested.param).name;
     });
 
-/// Requests that an assertion travels in: as the act-as token, as the presented one, as the target.
-class TravellingTokenTest : public HolderOfKeyTest, public ::testing::WithParamInterface<TextCase> {
+/// Requests that contain an assertion: as the act-as token, as the presented token, or as the
+/// target.
+class TravellingTokenTest : public HolderOfKeyTest, public testing::WithParamInterface<TextCase> {
  protected:
-  /// The assertion in the last request still is what its issuer signed, on its own.
+  /// The assertion in the last request is still valid as its issuer signed it when taken out of the
+  /// request.
   static void ExpectIntact(const SamlToken& token) {
     const std::string sent = AssertionIn(Sts().LastRequest().body);
     const std::string signer = Sts().SigningCertificatePem();
@@ -211,8 +218,9 @@ TEST_P(TravellingTokenTest, IsValidated) {
   }
 }
 
-// Two assertions in one request: the presented one proves the key, the other is acted for.
-TEST_P(TravellingTokenTest, IsPresentedBesideAnActAsToken) {
+// Two assertions in one request: the presented one proves the key, the other names the subject to
+// act for.
+TEST_P(TravellingTokenTest, IsPresentedTogetherWithAnActAsToken) {
   const auto token = AcquireBound(Talkative());
   TokenSpec spec = TenMinutes();
   spec.actAsToken = TalkativeBearer();
@@ -225,8 +233,8 @@ TEST_P(TravellingTokenTest, IsPresentedBesideAnActAsToken) {
             (*spec.actAsToken)->Id());
 }
 
-INSTANTIATE_TEST_SUITE_P(Texts, TravellingTokenTest, ::testing::ValuesIn(Texts()),
+INSTANTIATE_TEST_SUITE_P(Texts, TravellingTokenTest, testing::ValuesIn(Texts()),
                          [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,22 +1,28 @@
-// What each operation signs and asks for, judged from the octets that arrive.
+// What each operation signs and requests, checked in the octets that arrive.
+#include <string>
+#include <typeindex>
+#include <typeinfo>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
 #include "integration/wire_request.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAreArray;
-using ::testing::IsEmpty;
+using testing::ElementsAreArray;
+using testing::IsEmpty;
 
 using DevSts::RequestSignature;
 using Names = std::vector<std::string>;
 
 constexpr char kProof[] = "holderOfKeyProofSignature";
 
-/// What arrives, or why nothing does.
+/// What arrives, or why nothing arrives.
 struct Expected {
   Names securityEntries;
   std::string keyType;
@@ -51,7 +57,7 @@ struct Cell {
   Expected expected;
 };
 
-class SigningDecisionTest : public HolderOfKeyTest, public ::testing::WithParamInterface<Cell> {
+class SigningDecisionTest : public HolderOfKeyTest, public testing::WithParamInterface<Cell> {
  protected:
   static Arguments ArgumentsOf(const Cell& cell) {
     Arguments arguments;
@@ -69,8 +75,8 @@ class SigningDecisionTest : public HolderOfKeyTest, public ::testing::WithParamI
   }
 };
 
-// What the service says to a request that asks for a bound token without proving the key: the spec
-// acts as another, whose requests by password are not signed.
+// The service refuses a request for a bound token that does not prove the key: requests by password
+// are not signed if the spec has an act-as token.
 bool IsRefusedByTheService(const Cell& cell) {
   return cell.operation == Operation::Password && cell.expected.keyType == "PublicKey" &&
          cell.actsAs;
@@ -104,7 +110,7 @@ void ExpectOutcome(const Cell& cell, const Outcome& outcome) {
   EXPECT_EQ(outcome.token->ConfirmationType(), isBound ? HOLDER_OF_KEY : BEARER);
 }
 
-TEST_P(SigningDecisionTest, IsTheStatedOne) {
+TEST_P(SigningDecisionTest, IsTheExpectedOne) {
   const Cell& cell = GetParam();
   const Arguments arguments = ArgumentsOf(cell);
   const auto service = cell.hasKey ? HolderService() : Service();
@@ -146,27 +152,27 @@ const Expected kNotBound =
 
 INSTANTIATE_TEST_SUITE_P(
     WithoutConfig, SigningDecisionTest,
-    ::testing::Values(Cell{"Password", kPass, false, false, false, kBearerByPassword},
-                      Cell{"PasswordActAs", kPass, false, false, true, kBearerByPassword},
-                      Cell{"PasswordBearer", kPass, false, true, false, kBearerByPassword},
-                      Cell{"PasswordBearerActAs", kPass, false, true, true, kBearerByPassword},
-                      Cell{"Certificate", kCert, false, false, false, kNoCertificateKey},
-                      Cell{"CertificateActAs", kCert, false, false, true, kNoCertificateKey},
-                      Cell{"CertificateBearer", kCert, false, true, false, kNoCertificateKey},
-                      Cell{"CertificateBearerActAs", kCert, false, true, true, kNoCertificateKey},
-                      Cell{"Token", kTok, false, false, false, kNoTokenKey},
-                      Cell{"TokenActAs", kTok, false, false, true, kNoTokenKey},
-                      Cell{"TokenBearer", kTok, false, true, false, kNoTokenKey},
-                      Cell{"TokenBearerActAs", kTok, false, true, true, kNoTokenKey},
-                      Cell{"RenewBound", kRen, false, false, false, kNoRenewKey},
-                      Cell{"RenewBearer", kRen, false, true, false, kNoRenewKey},
-                      Cell{"ValidateBound", kVal, false, false, false, {kPlain, "", ""}},
-                      Cell{"ValidateBearer", kVal, false, true, false, {kPlain, "", ""}}),
+    testing::Values(Cell{"Password", kPass, false, false, false, kBearerByPassword},
+                    Cell{"PasswordActAs", kPass, false, false, true, kBearerByPassword},
+                    Cell{"PasswordBearer", kPass, false, true, false, kBearerByPassword},
+                    Cell{"PasswordBearerActAs", kPass, false, true, true, kBearerByPassword},
+                    Cell{"Certificate", kCert, false, false, false, kNoCertificateKey},
+                    Cell{"CertificateActAs", kCert, false, false, true, kNoCertificateKey},
+                    Cell{"CertificateBearer", kCert, false, true, false, kNoCertificateKey},
+                    Cell{"CertificateBearerActAs", kCert, false, true, true, kNoCertificateKey},
+                    Cell{"Token", kTok, false, false, false, kNoTokenKey},
+                    Cell{"TokenActAs", kTok, false, false, true, kNoTokenKey},
+                    Cell{"TokenBearer", kTok, false, true, false, kNoTokenKey},
+                    Cell{"TokenBearerActAs", kTok, false, true, true, kNoTokenKey},
+                    Cell{"RenewBound", kRen, false, false, false, kNoRenewKey},
+                    Cell{"RenewBearer", kRen, false, true, false, kNoRenewKey},
+                    Cell{"ValidateBound", kVal, false, false, false, {kPlain, "", ""}},
+                    Cell{"ValidateBearer", kVal, false, true, false, {kPlain, "", ""}}),
     [](const auto& tested) { return tested.param.name; });
 
 INSTANTIATE_TEST_SUITE_P(
     WithConfig, SigningDecisionTest,
-    ::testing::Values(
+    testing::Values(
         Cell{"Password", kPass, true, false, false, {kSignedPassword, "PublicKey", kProof}},
         Cell{"PasswordActAs", kPass, true, false, true, {kWithPassword, "PublicKey", kProof}},
         Cell{"PasswordBearer", kPass, true, true, false, kBearerByPassword},
@@ -187,7 +193,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 class LocalCheckTest : public HolderOfKeyTest {};
 
-TEST_F(LocalCheckTest, LifetimeIsJudgedFirstAndNothingIsSent) {
+TEST_F(LocalCheckTest, LifetimeIsCheckedFirstAndNothingIsSent) {
   Arguments arguments;
   arguments.token = Acquire();
   arguments.spec.confirmation = CONFIRMATION_BEARER;
@@ -230,4 +236,4 @@ TEST_F(LocalCheckTest, DelegateToLeavesUseKeyOutOfASignedRequest) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,6 +1,9 @@
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+#include <memory>
+#include <string>
+
+namespace SsoClient::Testing {
 
 Tarnik::Ref<Tarnik::Ssl::SSLContext> TrustCa(const DevSts::Server& server) {
   Tarnik::Ssl::SSLContextConfig config;
@@ -13,13 +16,15 @@ Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> TrustSigner(const std:
       {Tarnik::Crypto::CreateCertificatesFromPem(pem).front()});
 }
 
-std::shared_ptr<SecurityTokenService> MakeService(const DevSts::Server& server,
-                                                  const std::string& url) {
+std::shared_ptr<SecurityTokenService> MakeService(
+    const DevSts::Server& server, const std::string& url,
+    const boost::optional<HolderOfKeyConfig>& holderOfKeyConfig) {
   const auto sslContext = TrustCa(server);
   SecurityTokenServiceConfig config;
   config.url = url;
   config.sslContext = sslContext.get();
   config.tokenFactory = CreateSamlTokenFactory(TrustSigner(server.SigningCertificatePem()).get());
+  config.holderOfKeyConfig = holderOfKeyConfig;
   return CreateSecurityTokenService(config);
 }
 
@@ -41,4 +46,4 @@ DevSts::Server& StsTest::Sts() {
   return server;
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

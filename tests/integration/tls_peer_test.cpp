@@ -2,18 +2,18 @@
 
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 using DevSts::ServerCertificate;
 using DevSts::TlsProtocol;
-using ::testing::HasSubstr;
+using testing::HasSubstr;
 
 struct PeerCase {
   const char* name;
   DevSts::TlsOptions tls;
   const char* urlHost;
-  const char* reason;  ///< in the message; null: the token is acquired
+  const char* reason;  ///< in the message; null if the token is acquired
 };
 
 DevSts::TlsOptions With(ServerCertificate certificate) {
@@ -28,7 +28,7 @@ DevSts::TlsOptions With(TlsProtocol protocol) {
   return options;
 }
 
-class TlsPeerTest : public ::testing::TestWithParam<PeerCase> {};
+class TlsPeerTest : public testing::TestWithParam<PeerCase> {};
 
 TEST_P(TlsPeerTest, IsAcceptedOrRefusedWithItsReason) {
   DevSts::ServerOptions options;
@@ -46,7 +46,7 @@ TEST_P(TlsPeerTest, IsAcceptedOrRefusedWithItsReason) {
 
 INSTANTIATE_TEST_SUITE_P(
     Peers, TlsPeerTest,
-    ::testing::Values(
+    testing::Values(
         PeerCase{"Valid", With(ServerCertificate::Valid), "localhost", nullptr},
         PeerCase{"ValidByAddress", With(ServerCertificate::Valid), "127.0.0.1", nullptr},
         PeerCase{"ThroughIntermediate", With(ServerCertificate::ThroughIntermediate), "localhost",
@@ -95,4 +95,4 @@ TEST(TlsTrustTest, SessionsAreResumedOnOneContext) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,11 +1,16 @@
+#include <functional>
+#include <string>
+#include <utility>
+
 #include <gmock/gmock.h>
 
 #include "integration/sts_fixture.h"
+#include "integration/text_edits.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::HasSubstr;
+using testing::HasSubstr;
 
 constexpr char kTampered[] = "Failed to verify signature: token might have been tampered with.";
 
@@ -18,12 +23,6 @@ class TokenTrustTest : public StsTest {
   }
 };
 
-void Replace(std::string& text, std::string_view what, std::string_view by) {
-  const auto position = text.find(what);
-  ASSERT_NE(position, std::string::npos) << what;
-  text.replace(position, what.size(), by);
-}
-
 TEST_F(TokenTrustTest, AlteredSubjectIsRefused) {
   AfterSigning([](std::string& xml) { Replace(xml, ">alice@", ">admin@"); });
   EXPECT_EQ(MessageOf<InvalidSignatureException>([] { Acquire(); }), kTampered);
@@ -35,21 +34,14 @@ TEST_F(TokenTrustTest, AlteredIssuerIsRefused) {
 }
 
 TEST_F(TokenTrustTest, RemovedSignatureIsRefused) {
-  AfterSigning([](std::string& xml) {
-    const auto begin = xml.find("<ds:Signature");
-    const auto end = xml.find("</ds:Signature>");
-    ASSERT_NE(end, std::string::npos);
-    xml.erase(begin, end + std::string("</ds:Signature>").size() - begin);
-  });
+  AfterSigning(EraseSignature);
   EXPECT_THROW(Acquire(), ParseException);
 }
 
 TEST_F(TokenTrustTest, StrangersSignatureIsRefused) {
   const auto stranger = Sts().StrangerCredential();
   AfterSigning([stranger](std::string& xml) {
-    const auto begin = xml.find("<ds:Signature");
-    const auto end = xml.find("</ds:Signature>") + std::string("</ds:Signature>").size();
-    xml.erase(begin, end - begin);
+    EraseSignature(xml);
     xml = DevSts::SignXml(xml, stranger.privateKeyPem, stranger.certificatePem,
                           DevSts::AssertionOptions::DefaultSigning());
   });
@@ -60,9 +52,7 @@ TEST_F(TokenTrustTest, StrangersSignatureIsRefused) {
 TEST_F(TokenTrustTest, StrangersSignatureWithoutKeyInfoIsRefused) {
   const auto stranger = Sts().StrangerCredential();
   AfterSigning([stranger](std::string& xml) {
-    const auto begin = xml.find("<ds:Signature");
-    const auto end = xml.find("</ds:Signature>") + std::string("</ds:Signature>").size();
-    xml.erase(begin, end - begin);
+    EraseSignature(xml);
     auto signing = DevSts::AssertionOptions::DefaultSigning();
     signing.keyInfo = DevSts::KeyInfoContent::None;
     xml = DevSts::SignXml(xml, stranger.privateKeyPem, stranger.certificatePem, signing);
@@ -119,4 +109,4 @@ TEST_F(TokenTrustTest, ExpiredAnswerIsRefusedWithItsTime) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,16 +1,18 @@
-// Assertions of other shapes keep their signatures when they travel in requests.
+// Assertions of other shapes keep valid signatures when they are sent in requests.
+#include <memory>
+#include <string>
+#include <utility>
+
 #include <devsts/xml_security.h>
-#include <gmock/gmock.h>
-#include <tarnik/core/checked_cast.h>
-#include <tarnik/core/reader.h>
-#include <tarnik/xml/document.h>
-#include <tarnik/xml/xml_parser.h>
+#include <gtest/gtest.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "integration/text_edits.h"
 #include "integration/wire_request.h"
+#include "support/parse_xml.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 struct Shape {
@@ -19,17 +21,12 @@ struct Shape {
 };
 
 class TravellingTokenShapesTest : public HolderOfKeyTest,
-                                  public ::testing::WithParamInterface<Shape> {
+                                  public testing::WithParamInterface<Shape> {
  protected:
   TravellingTokenShapesTest() {
     DevSts::AssertionOptions options;
     GetParam().change(options);
     Sts().SetAssertionOptions(options);
-  }
-  static std::shared_ptr<const SamlToken> DelegableBearer() {
-    TokenSpec spec = Bearer();
-    spec.delegable = true;
-    return Acquire(spec);
   }
 };
 
@@ -60,40 +57,40 @@ using DevSts::AssertionOptions;
 
 INSTANTIATE_TEST_SUITE_P(
     Shapes, TravellingTokenShapesTest,
-    ::testing::Values(Shape{"Plain", [](AssertionOptions&) {}},
-                      Shape{"InheritedNamespaces",
-                            [](AssertionOptions& options) { options.inheritNamespaces = true; }},
-                      Shape{"Indented", [](AssertionOptions& options) { options.indent = true; }},
-                      Shape{"InheritedAndIndented",
-                            [](AssertionOptions& options) {
-                              options.inheritNamespaces = true;
-                              options.indent = true;
-                            }},
-                      Shape{"WithoutKeyInfo",
-                            [](AssertionOptions& options) {
-                              options.signing.keyInfo = DevSts::KeyInfoContent::None;
-                            }},
-                      Shape{"KeyValue",
-                            [](AssertionOptions& options) {
-                              options.signing.keyInfo = DevSts::KeyInfoContent::KeyValue;
-                            }},
-                      Shape{"Sha512",
-                            [](AssertionOptions& options) {
-                              options.signing.signature = DevSts::SignatureAlgorithm::RsaSha512;
-                              options.signing.digest = DevSts::DigestAlgorithm::Sha512;
-                            }},
-                      Shape{"Pss",
-                            [](AssertionOptions& options) {
-                              options.signing.signature = DevSts::SignatureAlgorithm::RsaPssSha256;
-                            }},
-                      Shape{"WithoutTypesAndFormat",
-                            [](AssertionOptions& options) {
-                              options.attributeValueTypes = false;
-                              options.issuerFormat = false;
-                            }}),
+    testing::Values(Shape{"Plain", [](AssertionOptions&) {}},
+                    Shape{"InheritedNamespaces",
+                          [](AssertionOptions& options) { options.inheritNamespaces = true; }},
+                    Shape{"Indented", [](AssertionOptions& options) { options.indent = true; }},
+                    Shape{"InheritedAndIndented",
+                          [](AssertionOptions& options) {
+                            options.inheritNamespaces = true;
+                            options.indent = true;
+                          }},
+                    Shape{"WithoutKeyInfo",
+                          [](AssertionOptions& options) {
+                            options.signing.keyInfo = DevSts::KeyInfoContent::None;
+                          }},
+                    Shape{"KeyValue",
+                          [](AssertionOptions& options) {
+                            options.signing.keyInfo = DevSts::KeyInfoContent::KeyValue;
+                          }},
+                    Shape{"Sha512",
+                          [](AssertionOptions& options) {
+                            options.signing.signature = DevSts::SignatureAlgorithm::RsaSha512;
+                            options.signing.digest = DevSts::DigestAlgorithm::Sha512;
+                          }},
+                    Shape{"Pss",
+                          [](AssertionOptions& options) {
+                            options.signing.signature = DevSts::SignatureAlgorithm::RsaPssSha256;
+                          }},
+                    Shape{"WithoutTypesAndFormat",
+                          [](AssertionOptions& options) {
+                            options.attributeValueTypes = false;
+                            options.issuerFormat = false;
+                          }}),
     [](const auto& tested) { return tested.param.name; });
 
-/// Ways in which a caller may come by a token other than as the answer of this service.
+/// Tokens that a caller has from other places than the answer of this service.
 class KeptTokenTest : public HolderOfKeyTest {
  protected:
   static void ExpectAccepted(std::shared_ptr<const SamlToken> token) {
@@ -117,24 +114,17 @@ TEST_F(KeptTokenTest, OfAFileWithDeclarationMarkAndCommentsIsAccepted) {
 
 TEST_F(KeptTokenTest, WrittenInAnotherWayIsAccepted) {
   std::string xml = AcquireBound()->Xml();
-  const auto replace = [&xml](const std::string& what, const std::string& by) {
-    const auto at = xml.find(what);
-    ASSERT_NE(at, std::string::npos) << what;
-    xml.replace(at, what.size(), by);
-  };
-  replace(">alice@EXAMPLE.COM<", "><![CDATA[alice]]>&#64;EXAMPLE.COM<");
-  replace("Version=\"2.0\"", "Version='2.0'");
-  replace("<saml2:Subject>", "<saml2:Subject  >");
+  Replace(xml, ">alice@EXAMPLE.COM<", "><![CDATA[alice]]>&#64;EXAMPLE.COM<");
+  Replace(xml, "Version=\"2.0\"", "Version='2.0'");
+  Replace(xml, "<saml2:Subject>", "<saml2:Subject  >");
   ExpectAccepted(CreateSamlToken(xml));
 }
 
 TEST_F(KeptTokenTest, OfADocumentIsAccepted) {
   const std::string xml =
       "<a xmlns=\"urn:a\" xmlns:b=\"urn:b\"><b:c>" + AcquireBound()->Xml() + "</b:c></a>";
-  const auto reader = Tarnik::CreateStringReader(xml);
-  const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
-  const auto parsed = Tarnik::Xml::CreateXMLParser(reader.get(), handler.get())->Parse();
-  auto* root = Tarnik::CheckedCast<Tarnik::Xml::Document>(parsed.get())->RootElement();
+  const auto document = ParseXml(xml);
+  auto* root = document->RootElement();
   const auto token =
       CreateSamlTokenFromDom(root->FirstChildElement("c")->FirstChildElement("Assertion"));
   EXPECT_NE(token->Xml().find("xmlns:b"), std::string::npos);
@@ -142,4 +132,4 @@ TEST_F(KeptTokenTest, OfADocumentIsAccepted) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,4 +1,15 @@
-// Holder-of-key operations over a user agent and connections of the caller's.
+// Holder-of-key operations over the caller's user agent and connections.
+#include <chrono>
+#include <cstdint>
+#include <future>
+#include <iterator>
+#include <memory>
+#include <set>
+#include <string>
+#include <typeinfo>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/http/http_user_agent.h>
@@ -6,15 +17,14 @@
 #include <tarnik/system/tcp_client_socket.h>
 #include <tarnik/system/thread_pool.h>
 
-#include <set>
-
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
+#include "support/holder_of_key.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::SizeIs;
+using testing::SizeIs;
 
 /// Connects to one port of this machine with TLS.
 class LoopbackTls final : public Tarnik::Http::CustomConnectionSpec, public Tarnik::ObjectImpl {
@@ -122,4 +132,4 @@ TEST_F(UserAgentTest, AsyncCallsInFlightShareTheUserAgent) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,19 +1,23 @@
 // Verdicts over real TLS.
+#include <chrono>
+#include <string>
+
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 
 #include "integration/holder_of_key_fixture.h"
+#include "integration/text_edits.h"
 #include "integration/wire_request.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
 using std::chrono::seconds;
-using ::testing::HasSubstr;
+using testing::HasSubstr;
 
 class ValidateSubjectTest : public HolderOfKeyTest {
  protected:
-  // With and without a holder-of-key configuration: it must not matter.
+  // With and without a holder-of-key configuration, which must make no difference.
   static bool IsValid(const SamlToken& token) {
     const bool verdict = Service()->ValidateSubject(token);
     EXPECT_EQ(HolderService()->ValidateSubject(token), verdict);
@@ -53,13 +57,11 @@ TEST_F(ValidateSubjectTest, TokenOfAnotherServiceIsNotValid) {
 
 TEST_F(ValidateSubjectTest, ForgedTokenIsNotValid) {
   std::string xml = AcquireBound()->Xml();
-  const auto at = xml.find(">alice@");
-  ASSERT_NE(at, std::string::npos);
-  xml.replace(at, 7, ">carol@");
+  Replace(xml, ">alice@", ">carol@");
   EXPECT_FALSE(IsValid(*CreateSamlToken(xml)));
 }
 
-TEST_F(ValidateSubjectTest, RequestIsTheStatedOne) {
+TEST_F(ValidateSubjectTest, RequestIsTheExpectedOne) {
   const auto token = AcquireBound();
   HolderService()->ValidateSubject(*token);
   const auto request = Sts().LastRequest();
@@ -74,4 +76,4 @@ TEST_F(ValidateSubjectTest, RequestIsTheStatedOne) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

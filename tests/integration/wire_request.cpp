@@ -1,15 +1,16 @@
 #include "integration/wire_request.h"
 
-#include <tarnik/core/checked_cast.h>
-#include <tarnik/core/reader.h>
-#include <tarnik/xml/character_nodes.h>
-#include <tarnik/xml/document.h>
-#include <tarnik/xml/xml_parser.h>
-
 #include <stdexcept>
+#include <string>
 #include <string_view>
+#include <vector>
 
-namespace SsoClient::Tests {
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/xml/character_nodes.h>
+
+#include "support/parse_xml.h"
+
+namespace SsoClient::Testing {
 
 namespace {
 
@@ -54,11 +55,8 @@ std::string KeyTypeOf(const ElementNode& request) {
 }  // namespace
 
 WireRequest ReadWireRequest(const std::string& body) {
-  const auto reader = Tarnik::CreateStringReader(body);
-  const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
-  const auto parsed = Tarnik::Xml::CreateXMLParser(reader.get(), handler.get())->Parse();
-  const auto* envelope =
-      Tarnik::CheckedCast<const Tarnik::Xml::Document>(parsed.get())->RootElement();
+  const auto document = ParseXml(body);
+  const ElementNode* envelope = document->RootElement();
   const ElementNode* security = Descend(envelope, {"Header", "Security"});
   const ElementNode* request = Descend(envelope, {"Body", "RequestSecurityToken"});
   if (security == nullptr || request == nullptr) {
@@ -89,4 +87,4 @@ std::string AssertionIn(const std::string& text) {
   return text.substr(from, end + kEnd.size() - from);
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,12 +1,12 @@
-#ifndef TESTS_INTEGRATION_WIRE_REQUEST_H
-#define TESTS_INTEGRATION_WIRE_REQUEST_H
+#ifndef SSOCLIENT_TESTS_INTEGRATION_WIRE_REQUEST_H
+#define SSOCLIENT_TESTS_INTEGRATION_WIRE_REQUEST_H
 
 #include <string>
 #include <vector>
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 
-/// What tells requests apart, read from the octets that a server received.
+/// What distinguishes requests, read from the octets that a server received.
 struct WireRequest {
   /// Local names of the entries of the Security header, in order.
   std::vector<std::string> securityEntries;
@@ -24,6 +24,6 @@ WireRequest ReadWireRequest(const std::string& body);
 /// The octets of the first assertion in `text`.
 std::string AssertionIn(const std::string& text);
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing
 
 #endif

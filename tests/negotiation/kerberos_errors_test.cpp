@@ -1,13 +1,16 @@
-// A login that Kerberos refuses tells why in Kerberos' own words, and nothing is sent.
+// If Kerberos refuses a login, the exception has the message of Kerberos, and nothing is sent.
+#include <chrono>
+#include <string>
+
 #include <gmock/gmock.h>
 
 #include "negotiation/realm_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
+using testing::HasSubstr;
+using testing::IsEmpty;
 using namespace std::chrono_literals;
 
 class KerberosErrorsTest : public RealmTest {
@@ -33,7 +36,7 @@ TEST_F(KerberosErrorsTest, UnknownService) {
   EXPECT_THAT(Failure(config), HasSubstr("not found in Kerberos database"));
 }
 
-// Each has a KDC that goes wrong, and so one of its own.
+// Each test has its own KDC, since it breaks it.
 class BrokenRealmTest : public KerberosErrorsTest {
  protected:
   ~BrokenRealmTest() override { Realm().SetClock(0s); }
@@ -61,4 +64,4 @@ TEST_F(BrokenRealmTest, RealmThatDoesNotAnswer) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,15 +1,21 @@
 // Logins by Kerberos at the dev STS, with tickets of a real KDC.
+#include <cstddef>
+#include <memory>
+#include <ostream>
+#include <set>
+#include <string>
+
 #include <gmock/gmock.h>
 
 #include "negotiation/realm_fixture.h"
 #include "sts/log_capture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::ElementsAre;
+using testing::ElementsAre;
 
-/// A way to log in, with so many legs.
+/// A way to log in, and the number of its legs.
 struct Way {
   const char* name;
   bool byContext;
@@ -28,7 +34,7 @@ void PrintTo(const Way& way, std::ostream* stream) {
   *stream << way.name;
 }
 
-class NegotiatedLoginTest : public RealmTest, public ::testing::WithParamInterface<Way> {
+class NegotiatedLoginTest : public RealmTest, public testing::WithParamInterface<Way> {
  protected:
   std::shared_ptr<const SamlToken> LogIn(NegotiationHandler& handler) {
     return GetParam().byContext ? LogInByContext(*Context(), handler)
@@ -82,11 +88,11 @@ TEST_P(NegotiatedLoginTest, ServesOneLoginAfterTheOtherWithOneHandler) {
 
 INSTANTIATE_TEST_SUITE_P(
     Ways, NegotiatedLoginTest,
-    ::testing::Values(Way{"LoopOneLeg", false, {}, 1}, Way{"ContextOneLeg", true, {}, 1},
-                      Way{"LoopSeveralLegs", false, Script(true, 0), 2},
-                      Way{"ContextSeveralLegs", true, Script(true, 0), 2},
-                      Way{"LoopMoreLegsThanKerberosNeeds", false, Script(true, 2), 4},
-                      Way{"ContextMoreLegsThanKerberosNeeds", true, Script(true, 2), 4}),
+    testing::Values(Way{"LoopOneLeg", false, {}, 1}, Way{"ContextOneLeg", true, {}, 1},
+                    Way{"LoopSeveralLegs", false, Script(true, 0), 2},
+                    Way{"ContextSeveralLegs", true, Script(true, 0), 2},
+                    Way{"LoopMoreLegsThanKerberosNeeds", false, Script(true, 2), 4},
+                    Way{"ContextMoreLegsThanKerberosNeeds", true, Script(true, 2), 4}),
     [](const auto& test) { return test.param.name; });
 
 class NegotiatedTokenTest : public RealmTest {};
@@ -111,7 +117,7 @@ TEST_F(NegotiatedTokenTest, IsGoodForTheOtherOperations) {
   EXPECT_EQ(service->AcquireTokenByToken(*token, TenMinutes())->Subject(), token->Subject());
 }
 
-TEST_F(NegotiatedTokenTest, CarriesWhatTheSpecAsksFor) {
+TEST_F(NegotiatedTokenTest, HasWhatTheSpecAsksFor) {
   TokenSpec spec = TenMinutes();
   spec.audienceRestriction = {"urn:one", "urn:two"};
   spec.tokenLifetimeSec = 300;
@@ -124,7 +130,7 @@ TEST_F(NegotiatedTokenTest, CarriesWhatTheSpecAsksFor) {
 }
 
 TEST_F(NegotiatedTokenTest, WritesItsLinesInOrder) {
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   const auto token = Service()->AcquireTokenByGSS(TenMinutes(), *Alice());
   EXPECT_THAT(
       log.Lines(),
@@ -138,4 +144,4 @@ TEST_F(NegotiatedTokenTest, WritesItsLinesInOrder) {
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,21 +1,19 @@
 // What a caller sees when the service goes wrong in the middle of a negotiation.
+#include <cstddef>
+#include <memory>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 
 #include "negotiation/realm_fixture.h"
 #include "sts/log_capture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
 
-using ::testing::Contains;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-
-DevSts::NegotiationScript TwoLegs() {
-  DevSts::NegotiationScript script;
-  script.requestMic = true;
-  return script;
-}
+using testing::HasSubstr;
+using testing::IsEmpty;
 
 const DevSts::NegotiationScript kOneLeg;
 
@@ -60,12 +58,12 @@ TEST_F(NegotiationFaultsTest, AnEmptyContextIdStartsTheContextAnew) {
   EXPECT_EQ(lost.token, nullptr);
   ASSERT_NE(lost.outputLeg, nullptr);
   EXPECT_FALSE(lost.outputLeg->empty());
-  // The next call is a first one again, with a login of its own.
+  // The next call starts a new negotiation with a new login.
   EXPECT_NE(LogInByContext(*context, *handler), nullptr);
   EXPECT_EQ(Legs().at(1).ordinal, 1U);
 }
 
-TEST_F(NegotiationFaultsTest, AnEmptyLegInTheMiddleIsNoAnswer) {
+TEST_F(NegotiationFaultsTest, AnEmptyLegInTheMiddleIsNotAnAnswer) {
   for (const bool omit : {false, true}) {
     Sts().ClearRequests();
     DevSts::LegMisbehavior leg;
@@ -79,14 +77,14 @@ TEST_F(NegotiationFaultsTest, AnEmptyLegInTheMiddleIsNoAnswer) {
   }
 }
 
-TEST_F(NegotiationFaultsTest, AnEmptyLegBesideTheTokenEndsTheLogin) {
+TEST_F(NegotiationFaultsTest, AnEmptyLegWithTheTokenEndsTheLogin) {
   Sts().SetNegotiationScript(kOneLeg);
   DevSts::LegMisbehavior leg;
   leg.leg = "";
   MisbehaveOnce(leg);
   const auto handler = Alice();
   EXPECT_NE(Service()->AcquireTokenByGSS(TenMinutes(), *handler), nullptr);
-  // Nothing of Kerberos has spoken for the service.
+  // Kerberos has not authenticated the service.
   EXPECT_FALSE(handler->IsEstablished());
 }
 
@@ -102,7 +100,7 @@ TEST_F(NegotiationFaultsTest, ALateFailureIsTheServicesFault) {
               HasSubstr("The negotiation was told to fail"));
 }
 
-TEST_F(NegotiationFaultsTest, AServiceThatDemandsACookieThatItNeverSetRefuses) {
+TEST_F(NegotiationFaultsTest, AServiceThatRequiresACookieItNeverSetRefuses) {
   DevSts::LegMisbehavior leg;
   leg.omitCookie = true;
   MisbehaveOnce(leg);
@@ -130,7 +128,7 @@ TEST_F(NegotiationFaultsTest, APrincipalWithoutAnAccountIsRefused) {
 }
 
 TEST_F(NegotiationFaultsTest, FailureStillEndsItsLog) {
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   auto script = TwoLegs();
   script.failAtLeg = 1;
   Sts().SetNegotiationScript(script);
@@ -165,7 +163,7 @@ class OddHandler final : public NegotiationHandler {
 };
 
 TEST_F(NegotiationFaultsTest, WhatTheHandlerThrowsReachesTheCallerUnchanged) {
-  // With one leg, the second call comes after the last leg of the service.
+  // With one leg, the second call is made after the last leg of the service.
   for (const auto& [script, call] :
        {std::pair{TwoLegs(), 1}, std::pair{TwoLegs(), 2}, std::pair{kOneLeg, 2}}) {
     Sts().SetNegotiationScript(script);
@@ -199,4 +197,4 @@ TEST_F(NegotiationFaultsTest, AHandlerWithoutALegIsRefusedBeforeAnythingIsSent) 
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

@@ -1,19 +1,17 @@
-// Many logins at once, and the asynchronous twin.
-#include <gmock/gmock.h>
-
+// Concurrent and asynchronous logins.
+#include <cstddef>
+#include <memory>
 #include <thread>
+#include <typeinfo>
+#include <vector>
+
+#include <gmock/gmock.h>
 
 #include "negotiation/realm_fixture.h"
 #include "support/async_call.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 namespace {
-
-DevSts::NegotiationScript TwoLegs() {
-  DevSts::NegotiationScript script;
-  script.requestMic = true;
-  return script;
-}
 
 class NegotiationThreadsTest : public RealmTest {
  protected:
@@ -39,7 +37,7 @@ TEST_F(NegotiationThreadsTest, LogInSideBySide) {
 TEST_F(NegotiationThreadsTest, AsyncLoginsRunSideBySide) {
   const auto service = Service();
   std::vector<std::shared_ptr<GssapiNegotiationHandler>> handlers(8);
-  std::vector<Testing::AsyncCall> calls(handlers.size());
+  std::vector<AsyncCall> calls(handlers.size());
   for (std::size_t i = 0; i < calls.size(); ++i) {
     handlers[i] = Alice();
     service->AcquireTokenByGSSAsync(TenMinutes(), *handlers[i], calls[i].Callback());
@@ -54,13 +52,13 @@ TEST_F(NegotiationThreadsTest, AsyncFailureOfKerberosReachesTheCallback) {
   auto config = AsAlice();
   config.targetService = "HTTP@unknown.example";
   const auto handler = CreateGssapiNegotiationHandler(config);
-  Testing::AsyncCall call;
+  AsyncCall call;
   Service()->AcquireTokenByGSSAsync(TenMinutes(), *handler, call.Callback());
   const auto report = call.Wait();
   EXPECT_EQ(report.token, nullptr);
   EXPECT_EQ(report.errorType, typeid(SsoException).name());
-  EXPECT_THAT(report.message, ::testing::HasSubstr("not found in Kerberos database"));
+  EXPECT_THAT(report.message, testing::HasSubstr("not found in Kerberos database"));
 }
 
 }  // namespace
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

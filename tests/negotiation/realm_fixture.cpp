@@ -1,13 +1,18 @@
 #include "negotiation/realm_fixture.h"
 
 #include <cstdlib>
+#include <memory>
+#include <string>
+#include <vector>
 
-namespace SsoClient::Tests {
+#include <gtest/gtest.h>
+
+namespace SsoClient::Testing {
 
 namespace {
 
-/// Makes the process a part of the realm before any thread reads the environment.
-class RealmEnvironment : public ::testing::Environment {
+/// Adds the process to the realm before any thread reads the environment.
+class RealmEnvironment : public testing::Environment {
  public:
   struct Parts {
     Parts() {
@@ -35,9 +40,15 @@ class RealmEnvironment : public ::testing::Environment {
 };
 
 RealmEnvironment* const environment = new RealmEnvironment;
-const auto* const registered = ::testing::AddGlobalTestEnvironment(environment);
+const auto* const registered = testing::AddGlobalTestEnvironment(environment);
 
 }  // namespace
+
+DevSts::NegotiationScript TwoLegs() {
+  DevSts::NegotiationScript script;
+  script.requestMic = true;
+  return script;
+}
 
 RealmTest::RealmTest() {
   Sts().ClearMisbehavior();
@@ -107,4 +118,4 @@ std::vector<DevSts::ReceivedLeg> RealmTest::Legs() {
   return legs;
 }
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing

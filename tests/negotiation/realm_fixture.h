@@ -1,5 +1,8 @@
-#ifndef TESTS_NEGOTIATION_REALM_FIXTURE_H
-#define TESTS_NEGOTIATION_REALM_FIXTURE_H
+#ifndef SSOCLIENT_TESTS_NEGOTIATION_REALM_FIXTURE_H
+#define SSOCLIENT_TESTS_NEGOTIATION_REALM_FIXTURE_H
+
+#include <memory>
+#include <vector>
 
 #include <devsts/kerberos_realm.h>
 #include <devsts/server.h>
@@ -7,22 +10,21 @@
 #include <ssoclient/gssapi_negotiation_handler.h>
 #include <ssoclient/ssoclient.h>
 
-#include <memory>
-#include <string>
-#include <vector>
-
 #include "integration/holder_of_key_fixture.h"
 #include "integration/sts_fixture.h"
 
-namespace SsoClient::Tests {
+namespace SsoClient::Testing {
 
 /// The dev STS's name in the realm.
 inline constexpr char kTarget[] = "HTTP@sts.example";
 
-/// One Kerberos realm for all tests of the process, which is a part of it, and one dev STS with a
-/// key of that realm, well-behaved at the start of each test. alice has a password there, machine a
-/// keytab, nobody an account at the STS.
-class RealmTest : public ::testing::Test {
+/// A negotiation of two legs.
+DevSts::NegotiationScript TwoLegs();
+
+/// One Kerberos realm for all tests of the process, which belongs to it, and one dev STS with a key
+/// of that realm, well-behaved at the start of each test. In the realm, "alice" has a password,
+/// "machine" has a keytab, and "nobody" has a password but no account at the STS.
+class RealmTest : public testing::Test {
  protected:
   RealmTest();
 
@@ -48,6 +50,6 @@ class RealmTest : public ::testing::Test {
   static std::vector<DevSts::ReceivedLeg> Legs();
 };
 
-}  // namespace SsoClient::Tests
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,23 +1,21 @@
 #include "sts/response_handler.h"
 
+#include <functional>
+#include <string>
+#include <utility>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/reader.h>
 
-#include <functional>
-
 #include "sts/answers.h"
 
 // Answers of one operation given to another.
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using Testing::Collection;
 using testing::ElementsAre;
-using Testing::Envelope;
-using Testing::kAssertionXml;
-using Testing::Requested;
-using Testing::Rstr;
 
 constexpr char kContext[] = " Context=\"urn:uuid:1\"";
 
@@ -73,7 +71,7 @@ std::string TokenType() {
   return "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>";
 }
 
-TEST(AnswerConfusionTest, AnAnswerServesItsOwnOperationAlone) {
+TEST(AnswerConfusionTest, AnAnswerServesOnlyItsOwnOperation) {
   EXPECT_THAT(OperationsThatAccept(Collection(Rstr(TokenType() + Requested(kAssertionXml)))),
               ElementsAre("issue"));
   EXPECT_THAT(OperationsThatAccept(Rstr(TokenType() + Requested(kAssertionXml))),
@@ -82,18 +80,18 @@ TEST(AnswerConfusionTest, AnAnswerServesItsOwnOperationAlone) {
   EXPECT_THAT(OperationsThatAccept(Rstr(Leg(), kContext)), ElementsAre("negotiate"));
 }
 
-// The last answer of a negotiation is that of an issue request with a context.
+// The last answer of a negotiation is the answer of an issue request with a context.
 TEST(AnswerConfusionTest, TheLastLegIssuesATokenToo) {
   EXPECT_THAT(
       OperationsThatAccept(Collection(Rstr(TokenType() + Requested(kAssertionXml), kContext))),
       ElementsAre("issue", "negotiate"));
 }
 
-TEST(AnswerConfusionTest, ARequestSentBackIsNoAnswer) {
+TEST(AnswerConfusionTest, ARequestSentBackIsNotAnAnswer) {
   EXPECT_THAT(OperationsThatAccept("<wst:RequestSecurityToken>" + TokenType() + Status() + Leg() +
                                    Requested(kAssertionXml) + "</wst:RequestSecurityToken>"),
               ElementsAre());
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,29 +1,25 @@
 #include "sts/response_handler.h"
 
+#include <cstddef>
+#include <string>
+#include <tuple>
+#include <utility>
+#include <vector>
+
+#include <gtest/gtest.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/reader.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 
 #include "sts/answers.h"
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
 
 // Forged assertions in the answers of a service: whatever part of an answer the client reads, it
-// never takes a forged one for a token.
-namespace SsoClient {
+// never accepts a forged assertion as a token.
+namespace SsoClient::Testing {
 namespace {
-
-using Testing::Collection;
-using Testing::Envelope;
-using Testing::Requested;
-using Testing::Rstr;
-using TestSupport::Arranged;
-using TestSupport::ForgedAssertion;
-using TestSupport::ForgedId;
-using TestSupport::ForgedSignature;
-using TestSupport::OriginalAssertion;
-using TestSupport::Place;
-using TestSupport::Replaced;
 
 std::string Issued(const std::string& content) {
   return Envelope(Collection(Rstr(Requested(content))));
@@ -56,7 +52,7 @@ std::vector<std::string> Answers(const std::string& forged, const std::string& o
   for (std::string& answer : InOneAnswer(original, forged)) {
     answers.push_back(std::move(answer));
   }
-  for (const Place place : TestSupport::AllPlaces()) {
+  for (const Place place : AllPlaces()) {
     const std::string arranged = Arranged(place, forged, original);
     if (!arranged.empty()) {
       answers.push_back(Issued(arranged));
@@ -65,7 +61,7 @@ std::vector<std::string> Answers(const std::string& forged, const std::string& o
   return answers;
 }
 
-// "" if refused, else the name of the accepted subject.
+// The name of the accepted subject; "" if refused.
 std::string AcceptedSubject(const std::string& answer,
                             const Tarnik::Xml::Security::KeyInfoResolver* resolver) {
   const auto reader = Tarnik::CreateStringReader(answer);
@@ -78,13 +74,13 @@ std::string AcceptedSubject(const std::string& answer,
   }
 }
 
-class AnswerWrapping : public testing::TestWithParam<std::tuple<ForgedId, ForgedSignature>> {};
+class AnswerWrappingTest : public testing::TestWithParam<std::tuple<ForgedId, ForgedSignature>> {};
 
-TEST_P(AnswerWrapping, NeverYieldsTheForgedAssertion) {
+TEST_P(AnswerWrappingTest, NeverYieldsTheForgedAssertion) {
   const auto& [id, signature] = GetParam();
   const std::string original = OriginalAssertion();
   const std::string forged = ForgedAssertion(id, signature, original);
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   EXPECT_EQ(AcceptedSubject(Issued(forged), resolver.get()), "");
   for (const std::string& answer : Answers(forged, original)) {
     const std::string accepted = AcceptedSubject(answer, resolver.get());
@@ -92,16 +88,16 @@ TEST_P(AnswerWrapping, NeverYieldsTheForgedAssertion) {
   }
 }
 
-INSTANTIATE_TEST_SUITE_P(Arrangements, AnswerWrapping,
-                         testing::Combine(testing::ValuesIn(TestSupport::AllForgedIds()),
-                                          testing::ValuesIn(TestSupport::AllForgedSignatures())));
+INSTANTIATE_TEST_SUITE_P(Arrangements, AnswerWrappingTest,
+                         testing::Combine(testing::ValuesIn(AllForgedIds()),
+                                          testing::ValuesIn(AllForgedSignatures())));
 
-// The same answers hand the forged assertion out when nothing is verified, so it is the signature
-// that the tests above see refused.
-TEST(AnswerWrappingTwin, ReadsForgeriesWhenNothingIsVerified) {
+// Without verification the same answers return the forged assertion. So the tests above fail
+// because of the signature.
+TEST(AnswerWrappingControlTest, ReadsForgeriesWhenNothingIsVerified) {
   const std::string original = OriginalAssertion();
   const std::string forged = ForgedAssertion(ForgedId::kNew, ForgedSignature::kStranger, original);
-  EXPECT_EQ(AcceptedSubject(Issued(original), TestSupport::TrustedResolver().get()), "alice");
+  EXPECT_EQ(AcceptedSubject(Issued(original), TrustedResolver().get()), "alice");
   EXPECT_EQ(AcceptedSubject(Issued(original), nullptr), "alice");
   EXPECT_EQ(AcceptedSubject(Issued(forged), nullptr), "admin");
   std::size_t forgedOnes = 0;
@@ -112,4 +108,4 @@ TEST(AnswerWrappingTwin, ReadsForgeriesWhenNothingIsVerified) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -65,8 +65,7 @@ inline std::string LastLegAnswer(const std::string& assertion = kAssertionXml,
                       " Context=\"" + context + "\"")));
 }
 
-/// What the canonical text of `kAssertionXml` is inside of `Envelope`: it keeps the declarations
-/// that it inherits.
+/// The canonical text of `kAssertionXml` inside `Envelope`, with the declarations that it inherits.
 inline constexpr char kCanonicalAssertion[] =
     R"(<saml2:Assertion xmlns:S="http://schemas.xmlsoap.org/soap/envelope/")"
     R"( xmlns:saml2="urn:oasis:names:tc:SAML:2.0:assertion")"

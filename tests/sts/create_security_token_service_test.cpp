@@ -1,15 +1,20 @@
+#include <memory>
+#include <string>
+
 #include <devsts/xml_security.h>
 #include <gmock/gmock.h>
 #include <ssoclient/security_token_service.h>
+#include <ssoclient/security_token_service_config.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/connection_spec.h>
 #include <tarnik/http/http_user_agent.h>
 
-#include <functional>
-#include <string>
-
 #include "sts/answers.h"
+#include "sts/fakes.h"
 #include "sts/token_specs.h"
 #include "support/assertion_text.h"
-#include "support/fake_saml_token.h"
 #include "support/holder_of_key.h"
 #include "support/thrown_message.h"
 #include "transport/fake_http.h"
@@ -17,29 +22,11 @@
 #include "transport/loopback_server.h"
 #include "transport/sso_connection_specs.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using testing::HasSubstr;
-using Testing::IssueAnswer;
-using Testing::OneHour;
 using testing::StartsWith;
-
-class AcceptingFactory final : public SamlTokenFactory {
- public:
-  std::shared_ptr<const SamlToken> CreateToken(const std::string& xml) const override {
-    return CreateToken(xml, 600);
-  }
-  std::shared_ptr<const SamlToken> CreateToken(const std::string& xml, long) const override {
-    return std::make_shared<Testing::FakeSamlToken>(xml);
-  }
-  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
-    return nullptr;
-  }
-  std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*, long) const override {
-    return nullptr;
-  }
-};
 
 template <class Config>
 std::string ArgumentError(const Config& config) {
@@ -55,7 +42,7 @@ constexpr char kNoKey[] = "No HolderOfKeyConfig provided. Unable to acquire toke
 
 template <class Config>
 std::string ByCertificateWithoutAKey(const Config& config) {
-  return TestSupport::ThrownMessage<Tarnik::InvalidStateException>(
+  return ThrownMessage<Tarnik::InvalidStateException>(
       [&] { CreateSecurityTokenService(config)->AcquireTokenByCertificate(OneHour()); });
 }
 
@@ -63,18 +50,17 @@ class CreateSecurityTokenServiceTest : public testing::Test {
  protected:
   CreateSecurityTokenServiceTest() {
     config_.url = server_.Url("/sts/STSService");
-    config_.tokenFactory = std::make_shared<AcceptingFactory>();
+    config_.tokenFactory = std::make_shared<FakeTokenFactory>();
   }
 
-  Testing::LoopbackServer server_{
-      [](const std::string&) { return Testing::OkAnswer(IssueAnswer()); }};
+  LoopbackServer server_{[](const std::string&) { return OkAnswer(IssueAnswer()); }};
   SecurityTokenServiceConfig config_;
 };
 
 TEST_F(CreateSecurityTokenServiceTest, AcquiresATokenOverHttp) {
   const auto token = CreateSecurityTokenService(config_)->AcquireToken("alice", "pw", OneHour());
   ASSERT_NE(token, nullptr);
-  EXPECT_EQ(token->Xml(), Testing::kCanonicalAssertion);
+  EXPECT_EQ(token->Xml(), kCanonicalAssertion);
   ASSERT_EQ(server_.Requests().size(), 1U);
   const auto request = server_.Requests()[0];
   EXPECT_THAT(request, StartsWith("POST /sts/STSService HTTP/1.1\r\n"));
@@ -96,21 +82,21 @@ TEST_F(CreateSecurityTokenServiceTest, ReadsTheConfigurationOnce) {
 }
 
 TEST_F(CreateSecurityTokenServiceTest, SignsWithTheConfiguredKeyOrNotAtAll) {
-  const auto credential = Testing::KeyCredential();
+  const auto credential = KeyCredential();
   EXPECT_EQ(ByCertificateWithoutAKey(config_), kNoKey);
-  config_.holderOfKeyConfig = Testing::ConfigOf(credential);
+  config_.holderOfKeyConfig = ConfigOf(credential);
   CreateSecurityTokenService(config_)->AcquireTokenByCertificate(OneHour());
-  const auto body = Testing::BodyOf(server_.Requests().at(0));
+  const auto body = BodyOf(server_.Requests().at(0));
   const auto verdict = DevSts::VerifyXml(body, credential.certificatePem);
   EXPECT_TRUE(verdict.valid) << verdict.reason;
 }
 
 TEST_F(CreateSecurityTokenServiceTest, TheKeyInfoResolverIsNotForTheService) {
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   config_.keyInfoResolver = resolver.get();
   const auto service = CreateSecurityTokenService(config_);
   EXPECT_EQ(resolver->RefCount(), 1);
-  // The answered token is signed by nobody.
+  // The token in the answer is not signed.
   EXPECT_NE(service->AcquireToken("alice", "pw", OneHour()), nullptr);
 }
 
@@ -119,8 +105,8 @@ TEST_F(CreateSecurityTokenServiceTest, HttpsNeedsAnSslContext) {
   EXPECT_EQ(ArgumentError(config_), "HTTPS connection requested but no SSLContext provided.");
 }
 
-TEST_F(CreateSecurityTokenServiceTest, HandsTheTlsValuesOn) {
-  const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
+TEST_F(CreateSecurityTokenServiceTest, PassesTheTlsValuesOn) {
+  const auto context = Tarnik::MakeRef<FakeSslContext>();
   config_.url = "https://127.0.0.1:" + std::to_string(server_.Port()) + "/";
   config_.sslContext = context.get();
   config_.sslPeerName = "sts.example";
@@ -142,15 +128,13 @@ TEST_F(CreateSecurityTokenServiceTest, ATokenFactoryIsNeeded) {
 class CreateSecurityTokenServiceExTest : public CreateSecurityTokenServiceTest {
  protected:
   CreateSecurityTokenServiceExTest() {
-    agent_->onWait = [] {
-      return Tarnik::MakeRef<Testing::FakeResponse>(200, "OK", IssueAnswer());
-    };
-    configEx_.url = "/used/as/it/stands";
+    agent_->onWait = [] { return Tarnik::MakeRef<FakeResponse>(200, "OK", IssueAnswer()); };
+    configEx_.url = "/used/unchanged";
     configEx_.userAgent = agent_;
     configEx_.tokenFactory = config_.tokenFactory;
   }
 
-  Tarnik::Ref<Testing::FakeUserAgent> agent_ = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  Tarnik::Ref<FakeUserAgent> agent_ = Tarnik::MakeRef<FakeUserAgent>();
   SecurityTokenServiceConfigEx configEx_;
 };
 
@@ -163,7 +147,7 @@ TEST_F(CreateSecurityTokenServiceExTest, SendsThroughTheCallersAgentFor240Second
 
 TEST_F(CreateSecurityTokenServiceExTest, SignsWithTheConfiguredKeyOrNotAtAll) {
   EXPECT_EQ(ByCertificateWithoutAKey(configEx_), kNoKey);
-  configEx_.holderOfKeyConfig = Testing::ConfigOf(Testing::KeyCredential());
+  configEx_.holderOfKeyConfig = ConfigOf(KeyCredential());
   EXPECT_NE(CreateSecurityTokenService(configEx_)->AcquireTokenByCertificate(OneHour()), nullptr);
 }
 
@@ -185,4 +169,4 @@ TEST_F(CreateSecurityTokenServiceExTest, AnAgentAndATokenFactoryAreNeeded) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -10,17 +10,22 @@
 #include <utility>
 #include <vector>
 
-#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
+#include <ssoclient/saml_token.h>
 #include <ssoclient/saml_token_factory.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/http_user_agent.h>
+#include <tarnik/xml/element_node.h>
 
 #include "support/fake_saml_token.h"
 #include "transport/transport.h"
 
 namespace SsoClient::Testing {
 
-/// Records what is sent and answers each request with the next text, the last one again and again,
-/// or fails. Requests may be sent from many threads; the records are read when all is done.
+/// Records what is sent and answers each request with the next text (the last one repeatedly), or
+/// fails. Requests may be sent from many threads; the records are read afterwards.
 class FakeTransport final : public Transport {
  public:
   explicit FakeTransport(std::string answer) : answers_{std::move(answer)} {}
@@ -60,7 +65,7 @@ class FakeTransport final : public Transport {
     const FakeTransport& transport_;
   };
 
-  /// The answer to the request that is recorded.
+  /// Records the request and returns its answer.
   const std::string& Record(const SoapRequest& request) const {
     const std::lock_guard lock(mutex_);
     actions.push_back(request.action);
@@ -72,7 +77,7 @@ class FakeTransport final : public Transport {
   std::vector<std::string> answers_;
 };
 
-/// Makes a token of any text, or refuses all; from many threads, too.
+/// Makes a token from any text, or refuses all. May be used from many threads.
 class FakeTokenFactory final : public SamlTokenFactory {
  public:
   std::shared_ptr<const SamlToken> CreateToken(const std::string&) const override {

@@ -1,18 +1,26 @@
 #include "sts/holder_of_key_check.h"
 
-#include <gmock/gmock.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-
 #include <chrono>
+#include <cstddef>
 #include <string>
 #include <utility>
 #include <vector>
 
+#include <devsts/certificates.h>
+#include <gmock/gmock.h>
+#include <ssoclient/holder_of_key_config.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/private_key.h>
+#include <tarnik/system/date_time.h>
+#include <boost/none.hpp>
+
 #include "support/holder_of_key.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using namespace std::chrono_literals;
@@ -20,19 +28,18 @@ using Tarnik::InvalidArgumentException;
 using Tarnik::InvalidStateException;
 using Tarnik::System::DateTime;
 using Tarnik::System::GetUtcDateTime;
-using TestSupport::ThrownMessage;
 
 std::string Complaint(const HolderOfKeyConfig& config) {
   return ThrownMessage<InvalidArgumentException>([&] { CheckHolderOfKeyConfig(config); });
 }
 
-TEST(HolderOfKeyCheckTest, AcceptsNoneAndOneThatFits) {
+TEST(HolderOfKeyCheckTest, AcceptsNoConfigurationAndAMatchingOne) {
   EXPECT_NO_THROW(CheckHolderOfKeyConfig(boost::none));
-  EXPECT_NO_THROW(CheckHolderOfKeyConfig(Testing::ConfigOf(Testing::KeyCredential())));
+  EXPECT_NO_THROW(CheckHolderOfKeyConfig(ConfigOf(KeyCredential())));
 }
 
 TEST(HolderOfKeyCheckTest, RefusesNullParts) {
-  auto config = Testing::ConfigOf(Testing::KeyCredential());
+  auto config = ConfigOf(KeyCredential());
   config.privateKey = nullptr;
   EXPECT_EQ(Complaint(config), "HolderOfKeyConfig: the private key must not be null.");
   config.certificate = nullptr;
@@ -40,22 +47,21 @@ TEST(HolderOfKeyCheckTest, RefusesNullParts) {
 }
 
 TEST(HolderOfKeyCheckTest, RefusesAKeyOfAnotherCertificate) {
-  auto config = Testing::ConfigOf(Testing::KeyCredential());
-  config.privateKey =
-      Testing::ConfigOf(Testing::KeyCredential(DevSts::KeyType::Rsa3072)).privateKey;
+  auto config = ConfigOf(KeyCredential());
+  config.privateKey = ConfigOf(KeyCredential(DevSts::KeyType::Rsa3072)).privateKey;
   EXPECT_EQ(Complaint(config),
             "HolderOfKeyConfig: the private key does not belong to the certificate.");
 }
 
 TEST(HolderOfKeyCheckTest, RefusesKeysThatCannotSign) {
-  EXPECT_EQ(Complaint(Testing::ConfigOf(Testing::KeyCredential(DevSts::KeyType::EcP256))),
+  EXPECT_EQ(Complaint(ConfigOf(KeyCredential(DevSts::KeyType::EcP256))),
             "HolderOfKeyConfig: the key must be an RSA key, since requests are signed with "
             "RSA-SHA256.");
-  EXPECT_EQ(Complaint(Testing::ConfigOf(Testing::KeyCredential(DevSts::KeyType::Rsa1024))),
+  EXPECT_EQ(Complaint(ConfigOf(KeyCredential(DevSts::KeyType::Rsa1024))),
             "HolderOfKeyConfig: the RSA key must have at least 2048 bits.");
 }
 
-/// A certificate of the caller's own making, which claims to be these bytes.
+/// A certificate that the caller implements and that returns these bytes.
 class ForeignCertificate final : public Tarnik::Crypto::Certificate, public Tarnik::ObjectImpl {
  public:
   explicit ForeignCertificate(std::string der) : der_(std::move(der)) {}
@@ -77,7 +83,7 @@ class ForeignCertificate final : public Tarnik::Crypto::Certificate, public Tarn
   std::vector<unsigned char> identifier_;
 };
 
-/// A private key of the caller's own making, which claims to fit.
+/// A private key that the caller implements and that claims to match.
 class ForeignKey final : public Tarnik::Crypto::PrivateKey, public Tarnik::ObjectImpl {
  public:
   Tarnik::Ref<const Tarnik::Crypto::PublicKey> GetPublicKey() const override { return nullptr; }
@@ -85,7 +91,7 @@ class ForeignKey final : public Tarnik::Crypto::PrivateKey, public Tarnik::Objec
 };
 
 TEST(HolderOfKeyCheckTest, RefusesCertificatesThatHoldNoKey) {
-  auto config = Testing::ConfigOf(Testing::KeyCredential());
+  auto config = ConfigOf(KeyCredential());
   config.certificate = Tarnik::MakeRef<const ForeignCertificate>("");
   EXPECT_EQ(Complaint(config),
             "HolderOfKeyConfig: the certificate cannot be used: A certificate cannot be empty.");
@@ -93,7 +99,7 @@ TEST(HolderOfKeyCheckTest, RefusesCertificatesThatHoldNoKey) {
   EXPECT_THAT(Complaint(config),
               testing::StartsWith("HolderOfKeyConfig: the certificate cannot be used: The "
                                   "certificate cannot be decoded: "));
-  const auto genuine = Testing::ConfigOf(Testing::KeyCredential()).certificate;
+  const auto genuine = ConfigOf(KeyCredential()).certificate;
   std::string unknownKind(reinterpret_cast<const char*>(genuine->DerBytes()), genuine->DerLength());
   // The object identifier of RSA keys, with another last arc.
   const std::string rsa("\x2a\x86\x48\x86\xf7\x0d\x01\x01\x01", 9);
@@ -105,7 +111,7 @@ TEST(HolderOfKeyCheckTest, RefusesCertificatesThatHoldNoKey) {
 }
 
 TEST(HolderOfKeyCheckTest, RefusesAForeignKeyWithoutAPublicHalf) {
-  auto config = Testing::ConfigOf(Testing::KeyCredential());
+  auto config = ConfigOf(KeyCredential());
   config.privateKey = Tarnik::MakeRef<const ForeignKey>();
   EXPECT_EQ(Complaint(config), "HolderOfKeyConfig: the private key has no public half.");
 }
@@ -118,8 +124,8 @@ DateTime Later(const DateTime& time, long seconds) {
   return Tarnik::System::DateTimeFromUtc(time.GetUtcTime() + seconds * 1'000'000, false);
 }
 
-TEST(HolderOfKeyCheckTest, HoldsThePeriodOfValidityWithTenMinutesForTheClocks) {
-  const auto certificate = Testing::ConfigOf(Testing::KeyCredential()).certificate;
+TEST(HolderOfKeyCheckTest, ChecksThePeriodOfValidityWithTenMinutesOfTolerance) {
+  const auto certificate = ConfigOf(KeyCredential()).certificate;
   const std::string accepted = "Nothing was thrown.";
   EXPECT_EQ(PeriodComplaint(*certificate, GetUtcDateTime()), accepted);
   EXPECT_EQ(PeriodComplaint(*certificate, Later(certificate->NotBefore(), -600)), accepted);
@@ -133,4 +139,4 @@ TEST(HolderOfKeyCheckTest, HoldsThePeriodOfValidityWithTenMinutesForTheClocks) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,9 +1,15 @@
 // What a hostile service may answer to the legs of a negotiation.
-#include <gmock/gmock.h>
-#include <tarnik/text/string_util.h>
-
+#include <cstddef>
+#include <memory>
 #include <string>
+#include <utility>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/negotiation_handler.h>
+#include <tarnik/text/string_util.h>
+#include <boost/none.hpp>
 
 #include "sts/answers.h"
 #include "sts/fakes.h"
@@ -16,25 +22,16 @@
 #include "support/parse_xml.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using Testing::Collection;
-using Testing::Envelope;
-using Testing::FakeTransport;
 using testing::HasSubstr;
 using testing::IsEmpty;
-using Testing::LastLegAnswer;
-using Testing::LegAnswer;
 using testing::Not;
-using Testing::OneHour;
-using Testing::Requested;
-using Testing::Rstr;
-using TestSupport::ThrownMessage;
 
 using Leg = std::vector<unsigned char>;
 
-/// Keeps what it is given, and answers with a byte.
+/// Records what it is given and returns one byte.
 class ListeningHandler final : public NegotiationHandler {
  public:
   std::shared_ptr<const Leg> Negotiate(const Leg& serverLeg) override {
@@ -45,7 +42,7 @@ class ListeningHandler final : public NegotiationHandler {
   std::vector<Leg> received;
 };
 
-/// A loop, or a context that is called until it has a token.
+/// With the loop, or with a context that is called until it has a token.
 class HostileNegotiationTest : public testing::TestWithParam<bool> {
  protected:
   void Answer(std::vector<std::string> answers) {
@@ -70,32 +67,31 @@ class HostileNegotiationTest : public testing::TestWithParam<bool> {
   std::shared_ptr<const RequestBuilder> builder_ =
       std::make_shared<RequestBuilderImpl>(boost::none);
   std::shared_ptr<const ResponseHandler> responseHandler_ = std::make_shared<ResponseHandlerImpl>();
-  std::shared_ptr<Testing::FakeTokenFactory> factory_ =
-      std::make_shared<Testing::FakeTokenFactory>();
+  std::shared_ptr<FakeTokenFactory> factory_ = std::make_shared<FakeTokenFactory>();
   ListeningHandler handler_;
 };
 
 INSTANTIATE_TEST_SUITE_P(Ways, HostileNegotiationTest, testing::Bool(),
                          [](const auto& test) { return test.param ? "Context" : "Loop"; });
 
-std::string Fault() {
-  return Envelope(Testing::Fault("wst:RequestFailed", "enough"));
+std::string FaultAnswer() {
+  return Envelope(Fault("wst:RequestFailed", "enough"));
 }
 
 std::string ContextIn(const std::string& request) {
-  const auto document = Testing::ParseXml(request);
+  const auto document = ParseXml(request);
   const auto* message = document->RootElement()->FirstChildElement("Body")->FirstChildElement(
       "RequestSecurityTokenResponse");
   return std::string(message->FindAttribute("Context").value_or("no Context"));
 }
 
-// As it is written in an answer, and what it means.
+// As it is written in an answer, and its value.
 struct ContextId {
   std::string written;
   std::string meant;
 };
 
-TEST_P(HostileNegotiationTest, AContextIdComesBackAsItIsWhateverIsInIt) {
+TEST_P(HostileNegotiationTest, AnyContextIdIsSentBackUnchanged) {
   const std::string huge(std::size_t{1} << 20, 'c');
   for (const auto& [written, meant] :
        {ContextId{"&quot;>&lt;wst:BinaryExchange/>", "\"><wst:BinaryExchange/>"},
@@ -104,7 +100,7 @@ TEST_P(HostileNegotiationTest, AContextIdComesBackAsItIsWhateverIsInIt) {
         ContextId{"\xF0\x9F\x98\x80\xE2\x80\xAE", "\xF0\x9F\x98\x80\xE2\x80\xAE"},
         ContextId{" ", " "}, ContextId{huge, huge}}) {
     SCOPED_TRACE(meant.substr(0, 50));
-    Answer({LegAnswer(written), Fault()});
+    Answer({LegAnswer(written), FaultAnswer()});
     EXPECT_EQ(ThrownMessage<SsoException>([this] { LogIn(); }),
               "Unexpected SOAP fault: wst:RequestFailed; request failed.");
     ASSERT_EQ(transport_->bodies.size(), 2U);
@@ -113,7 +109,7 @@ TEST_P(HostileNegotiationTest, AContextIdComesBackAsItIsWhateverIsInIt) {
   }
 }
 
-TEST_P(HostileNegotiationTest, AContextIdThatXmlCannotCarryIsNoAnswer) {
+TEST_P(HostileNegotiationTest, AContextIdThatXmlForbidsIsRefused) {
   for (const std::string written :
        {"&#0;", "&#1;", "&#xFFFE;", "&#xD800;", "<", "&unknown;", "\x01", "\xC0\x80", "\xFF"}) {
     SCOPED_TRACE(written);
@@ -128,25 +124,25 @@ std::string Exchange(const std::string& content, const std::string& attributes =
   return "<wst:BinaryExchange" + attributes + ">" + content + "</wst:BinaryExchange>";
 }
 
-// An answer's content, and the leg that the handler is given of it.
+// The content of an answer, and the leg that the handler receives.
 struct LegContent {
   std::string content;
   std::string leg;
 };
 
-TEST_P(HostileNegotiationTest, OfManyLegsTheHandlerIsGivenTheFirst) {
+TEST_P(HostileNegotiationTest, TheHandlerReceivesTheFirstOfManyLegs) {
   for (const auto& [content, leg] :
        {LegContent{Exchange("Zmlyc3Q=") + Exchange("c2Vjb25k"), "first"},
         LegContent{Exchange("Zmly<x>c2Vjb25k</x>") + Exchange("c2Vjb25k"), "fir"},
         LegContent{"<x>" + Exchange("c2Vjb25k") + "</x>" + Exchange("Zmlyc3Q="), "first"},
-        // Nothing but Base64 and SPNEGO is asked for, whatever the service calls it.
+        // Only Base64 and SPNEGO are requested, whatever the service calls them.
         LegContent{Exchange("Zmlyc3Q=", " EncodingType=\"urn:hex\" ValueType=\"urn:other\""),
                    "first"},
-        // A token beside a leg that is not the last is none yet.
-        LegContent{Exchange("Zmlyc3Q=") + Requested(Testing::kAssertionXml), "first"}}) {
+        // A token next to a leg that is not the last is ignored.
+        LegContent{Exchange("Zmlyc3Q=") + Requested(kAssertionXml), "first"}}) {
     SCOPED_TRACE(content);
     handler_.received.clear();
-    Answer({LegAnswer("c", content), Fault()});
+    Answer({LegAnswer("c", content), FaultAnswer()});
     EXPECT_THROW(LogIn(), SsoException);
     ASSERT_EQ(handler_.received.size(), 2U);
     EXPECT_EQ(std::string(handler_.received[1].begin(), handler_.received[1].end()), leg);
@@ -156,7 +152,7 @@ TEST_P(HostileNegotiationTest, OfManyLegsTheHandlerIsGivenTheFirst) {
 
 TEST_P(HostileNegotiationTest, ALegOfMegabytesReachesTheHandlerWhole) {
   const Leg leg(std::size_t{8} << 20, 0xAB);
-  Answer({LegAnswer("c", Exchange(Tarnik::StringUtil::Base64Encode(leg))), Fault()});
+  Answer({LegAnswer("c", Exchange(Tarnik::StringUtil::Base64Encode(leg))), FaultAnswer()});
   EXPECT_THROW(LogIn(), SsoException);
   ASSERT_EQ(handler_.received.size(), 2U);
   EXPECT_TRUE(handler_.received[1] == leg);
@@ -167,7 +163,7 @@ TEST(HostileNegotiationLoopTest, EndsWhenTheServiceNeverDoes) {
     const auto transport = std::make_shared<FakeTransport>(LegAnswer("c", Exchange(leg)));
     const SecurityTokenServiceImpl service(std::make_shared<RequestBuilderImpl>(boost::none),
                                            transport, std::make_shared<ResponseHandlerImpl>(),
-                                           std::make_shared<Testing::FakeTokenFactory>());
+                                           std::make_shared<FakeTokenFactory>());
     ListeningHandler handler;
     EXPECT_EQ(ThrownMessage<CommunicationException>(
                   [&] { service.AcquireTokenByGSS(OneHour(), handler); }),
@@ -177,11 +173,11 @@ TEST(HostileNegotiationLoopTest, EndsWhenTheServiceNeverDoes) {
   }
 }
 
-TEST_P(HostileNegotiationTest, AFaultBesideATokenIsAFault) {
-  const std::string fault = Testing::Fault("wst:FailedAuthentication", "no");
+TEST_P(HostileNegotiationTest, AFaultWithATokenIsAFault) {
+  const std::string fault = Fault("wst:FailedAuthentication", "no");
   const std::string token =
       Collection(Rstr("<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>" +
-                          Requested(Testing::kAssertionXml),
+                          Requested(kAssertionXml),
                       " Context=\"c\""));
   for (const auto& body : {fault + token, token + fault}) {
     Answer({LegAnswer("c"), Envelope(body)});
@@ -192,9 +188,9 @@ TEST_P(HostileNegotiationTest, AFaultBesideATokenIsAFault) {
   }
 }
 
-TEST_P(HostileNegotiationTest, AnAnswerOfAnotherOperationInTheMiddleIsNone) {
+TEST_P(HostileNegotiationTest, AnAnswerOfAnotherOperationInTheMiddleIsRefused) {
   for (const auto& answer :
-       {Testing::IssueAnswer(), Testing::RenewAnswer(),
+       {IssueAnswer(), RenewAnswer(),
         Envelope(Rstr("<wst:Status><wst:Code>http://docs.oasis-open.org/ws-sx/ws-trust/200512/"
                       "status/valid</wst:Code></wst:Status>"))}) {
     Answer({LegAnswer("c"), answer});
@@ -208,7 +204,7 @@ TEST_P(HostileNegotiationTest, NoLegReachesTheLogOrAMessage) {
   for (const auto& answer :
        {LegAnswer("c", Exchange(secret + "!")), LastLegAnswer("<Other/>", Exchange(secret)),
         LegAnswer("&#1;", Exchange(secret))}) {
-    const Testing::LogCapture log(9);
+    const LogCapture log(9);
     Answer({answer});
     const auto message = ThrownMessage<SsoException>([this] { LogIn(); });
     EXPECT_THAT(message, Not(HasSubstr(secret)));
@@ -219,4 +215,4 @@ TEST_P(HostileNegotiationTest, NoLegReachesTheLogOrAMessage) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,12 +1,12 @@
 #include "sts/logger.h"
 
-#include <gmock/gmock.h>
-
 #include <stdexcept>
+
+#include <gmock/gmock.h>
 
 #include "sts/log_capture.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using testing::ElementsAre;
@@ -16,8 +16,8 @@ TEST(LoggerTest, IsNamedAfterTheLibrary) {
   EXPECT_STREQ(kLogger.Name(), "SsoClient");
 }
 
-TEST(OperationLogTest, TellsStartAndEndAtLevelSeven) {
-  const Testing::LogCapture log(7);
+TEST(OperationLogTest, WritesStartAndEndAtLevelSeven) {
+  const LogCapture log(7);
   {
     const OperationLog operation("AcquireToken");
     EXPECT_THAT(log.Lines(),
@@ -27,8 +27,8 @@ TEST(OperationLogTest, TellsStartAndEndAtLevelSeven) {
                                        "7 END operation SecurityTokenServiceImpl::AcquireToken"));
 }
 
-TEST(OperationLogTest, TellsTheEndOfAnOperationThatFails) {
-  const Testing::LogCapture log(7);
+TEST(OperationLogTest, WritesTheEndOfAnOperationThatFails) {
+  const LogCapture log(7);
   try {
     const OperationLog operation("X");
     throw std::runtime_error("failed");
@@ -39,10 +39,10 @@ TEST(OperationLogTest, TellsTheEndOfAnOperationThatFails) {
 }
 
 TEST(OperationLogTest, IsSilentBelowLevelSeven) {
-  const Testing::LogCapture log(6);
+  const LogCapture log(6);
   { const OperationLog operation("X"); }
   EXPECT_THAT(log.Lines(), IsEmpty());
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,9 +1,17 @@
 #include "sts/security_token_service_impl.h"
 
-#include <gmock/gmock.h>
-
+#include <memory>
 #include <string>
 #include <typeinfo>
+
+#include <gmock/gmock.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/saml_token.h>
+#include <ssoclient/security_token_service.h>
+#include <ssoclient/token_spec.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/reader.h>
+#include <boost/none.hpp>
 
 #include "describe/describe.h"
 #include "sts/answers.h"
@@ -18,18 +26,13 @@
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using Testing::AsyncCall;
 using testing::ElementsAre;
-using Testing::FakeTokenFactory;
-using Testing::FakeTransport;
 using testing::HasSubstr;
 using testing::IsEmpty;
-using Testing::IssueAnswer;
 using testing::Not;
-using Testing::OneHour;
 
 class EmptyResponseHandler final : public ResponseHandler {
  public:
@@ -59,14 +62,14 @@ class SecurityTokenServiceImplTest : public testing::Test {
 TEST_F(SecurityTokenServiceImplTest, SendsTheRequestAndMakesATokenOfTheAnswer) {
   const auto token = MakeService()->AcquireToken("alice", "hunter2", OneHour());
   ASSERT_NE(token, nullptr);
-  EXPECT_EQ(token->Xml(), Testing::kCanonicalAssertion);
+  EXPECT_EQ(token->Xml(), kCanonicalAssertion);
   EXPECT_EQ(transport_->sessions, 1);
   EXPECT_THAT(transport_->actions,
               ElementsAre("http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue"));
   ASSERT_EQ(transport_->bodies.size(), 1U);
   EXPECT_THAT(transport_->bodies[0], HasSubstr("<wsse:Username>alice</wsse:Username>"));
   EXPECT_THAT(transport_->bodies[0], HasSubstr(">hunter2</wsse:Password>"));
-  EXPECT_THAT(factory_->texts, ElementsAre(Testing::kCanonicalAssertion));
+  EXPECT_THAT(factory_->texts, ElementsAre(kCanonicalAssertion));
   EXPECT_THAT(factory_->tolerances, ElementsAre(600));
 }
 
@@ -79,11 +82,11 @@ TEST_F(SecurityTokenServiceImplTest, EveryOperationHasASessionOfItsOwn) {
 
 TEST_F(SecurityTokenServiceImplTest, AnEmptyAssertionGivesNoToken) {
   const SecurityTokenServiceImpl service(
-      std::make_shared<RequestBuilderImpl>(Testing::ConfigOf(Testing::KeyCredential())), transport_,
+      std::make_shared<RequestBuilderImpl>(ConfigOf(KeyCredential())), transport_,
       std::make_shared<EmptyResponseHandler>(), factory_);
-  Testing::FakeSamlToken presented("<Presented ID=\"_1\"/>");
+  FakeSamlToken presented("<Presented ID=\"_1\"/>");
   presented.confirmationType = HOLDER_OF_KEY;
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   EXPECT_EQ(service.AcquireToken("alice", "pw", OneHour()), nullptr);
   EXPECT_EQ(service.AcquireTokenByCertificate(OneHour()), nullptr);
   EXPECT_EQ(service.AcquireTokenByToken(presented, OneHour()), nullptr);
@@ -93,7 +96,7 @@ TEST_F(SecurityTokenServiceImplTest, AnEmptyAssertionGivesNoToken) {
 }
 
 TEST_F(SecurityTokenServiceImplTest, TracesTheOperation) {
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   auto spec = OneHour();
   spec.audienceRestriction = {"aud"};
   const auto token = MakeService()->AcquireToken("alice", "hunter2", spec);
@@ -106,27 +109,27 @@ TEST_F(SecurityTokenServiceImplTest, TracesTheOperation) {
                           "7 END operation SecurityTokenServiceImpl::AcquireToken"));
 }
 
-TEST_F(SecurityTokenServiceImplTest, TellsOnlyTheSuccessAtLevelsFiveAndSix) {
+TEST_F(SecurityTokenServiceImplTest, LogsOnlyTheSuccessAtLevelsFiveAndSix) {
   for (const int level : {5, 6}) {
-    const Testing::LogCapture log(level);
+    const LogCapture log(level);
     const auto token = MakeService()->AcquireToken("alice", "pw", OneHour());
     EXPECT_THAT(log.Lines(), ElementsAre("5 Successfully acquired token: " +
                                          CreateSamlTokenDescription(*token)));
   }
-  const Testing::LogCapture log(4);
+  const LogCapture log(4);
   MakeService()->AcquireToken("alice", "pw", OneHour());
   EXPECT_THAT(log.Lines(), IsEmpty());
 }
 
 TEST_F(SecurityTokenServiceImplTest, NeverLogsAPasswordOrAToken) {
-  const Testing::LogCapture log(9);
+  const LogCapture log(9);
   MakeService()->AcquireToken("alice", "hunter2", OneHour());
   EXPECT_THAT(log.Lines(), testing::Each(Not(HasSubstr("hunter2"))));
   EXPECT_THAT(log.Lines(), testing::Each(Not(HasSubstr("<saml2:"))));
 }
 
 TEST_F(SecurityTokenServiceImplTest, AnArgumentErrorIsThrownBeforeAnythingIsSent) {
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   try {
     MakeService()->AcquireToken("alice", "pw", TokenSpec());
     FAIL();
@@ -142,7 +145,7 @@ TEST_F(SecurityTokenServiceImplTest, AnArgumentErrorIsThrownBeforeAnythingIsSent
 
 TEST_F(SecurityTokenServiceImplTest, FailuresOfTheExchangePassUnchanged) {
   transport_->failure.emplace("Server returned error: 503 Service Unavailable");
-  const Testing::LogCapture log(7);
+  const LogCapture log(7);
   try {
     MakeService()->AcquireToken("alice", "pw", OneHour());
     FAIL();
@@ -157,8 +160,8 @@ TEST_F(SecurityTokenServiceImplTest, FailuresOfTheExchangePassUnchanged) {
 
 TEST_F(SecurityTokenServiceImplTest, RefusalsOfTheTokenFactoryPassUnchanged) {
   factory_->isRefusing = true;
-  const Testing::LogCapture log(7);
-  EXPECT_EQ(TestSupport::ThrownMessage<InvalidSignatureException>(
+  const LogCapture log(7);
+  EXPECT_EQ(ThrownMessage<InvalidSignatureException>(
                 [&] { MakeService()->AcquireToken("alice", "pw", OneHour()); }),
             "refused");
   EXPECT_EQ(log.Lines().back(), "7 END operation SecurityTokenServiceImpl::AcquireToken");
@@ -169,7 +172,7 @@ class FaultedServiceTest : public SecurityTokenServiceImplTest {
  protected:
   FaultedServiceTest()
       : SecurityTokenServiceImplTest(
-            Testing::Envelope(Testing::Fault("wst:FailedAuthentication", "Invalid credentials"))) {}
+            Envelope(Fault("wst:FailedAuthentication", "Invalid credentials"))) {}
 };
 
 TEST_F(FaultedServiceTest, FaultsPassUnchanged) {
@@ -188,7 +191,7 @@ TEST_F(SecurityTokenServiceImplAsyncTest, ReportsTheToken) {
   MakeService()->AcquireTokenAsync("alice", "hunter2", OneHour(), call.Callback());
   const auto report = call.Wait();
   ASSERT_NE(report.token, nullptr);
-  EXPECT_EQ(report.token->Xml(), Testing::kCanonicalAssertion);
+  EXPECT_EQ(report.token->Xml(), kCanonicalAssertion);
   EXPECT_EQ(report.errorType, "");
   EXPECT_THAT(transport_->bodies[0], HasSubstr(">hunter2</wsse:Password>"));
 }
@@ -225,19 +228,18 @@ TEST_F(SecurityTokenServiceImplAsyncTest, AnEmptyCallbackIsRefusedAtTheCall) {
   EXPECT_EQ(transport_->sessions, 0);
 }
 
-TEST_F(SecurityTokenServiceImplTest, OperationsStandInTheirOrder) {
+TEST_F(SecurityTokenServiceImplTest, OperationsKeepTheirSlotOrder) {
   const auto service = MakeService();
   const SecurityTokenService* object = service.get();
   using Acquire = std::shared_ptr<const SamlToken>(const void*, const std::string&,
                                                    const std::string&, const TokenSpec&);
-  EXPECT_NE(TestSupport::VtableSlot<Acquire>(object, 0)(object, "alice", "pw", OneHour()), nullptr);
+  EXPECT_NE(VtableSlot<Acquire>(object, 0)(object, "alice", "pw", OneHour()), nullptr);
   using AcquireAsync = void(const void*, const std::string&, const std::string&, const TokenSpec&,
                             SecurityTokenService::TokenCallback);
   AsyncCall call;
-  TestSupport::VtableSlot<AcquireAsync>(object, 6)(object, "alice", "pw", OneHour(),
-                                                   call.Callback());
+  VtableSlot<AcquireAsync>(object, 6)(object, "alice", "pw", OneHour(), call.Callback());
   EXPECT_NE(call.Wait().token, nullptr);
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

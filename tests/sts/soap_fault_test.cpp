@@ -1,19 +1,17 @@
 #include "sts/soap_fault.h"
 
-#include <gmock/gmock.h>
-#include <ssoclient/exceptions.h>
-
 #include <string>
 #include <typeinfo>
+
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
 
 #include "sts/answers.h"
 #include "support/parse_xml.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
-
-using Testing::Envelope;
-using Testing::Fault;
 
 constexpr char kExpired[] = "Password of the user logging on is expired";
 
@@ -30,7 +28,7 @@ Thrown Expect(const std::string& message) {
 }
 
 Thrown ThrownFor(const std::string& envelope) {
-  const auto document = Testing::ParseXml(envelope);
+  const auto document = ParseXml(envelope);
   try {
     CheckSoapFault(*document->RootElement());
   } catch (const Tarnik::Exception& error) {
@@ -87,7 +85,7 @@ TEST(SoapFaultTest, CodesAreComparedByTheirNamespace) {
       Expect<SsoException>("Unexpected SOAP fault: wst:FailedAuthentication; request failed."));
 }
 
-TEST(SoapFaultTest, AnyOtherCodeIsToldAsItWasReceived) {
+TEST(SoapFaultTest, AnyOtherCodeIsReportedAsReceived) {
   for (const std::string code :
        {"wsse:FailedAuthentication", "S:Server", "wst:InvalidRequest", "wst:failedauthentication",
         "wst:FailedAuthentication2", "FailedAuthentication", "InvalidSecurityToken",
@@ -97,7 +95,7 @@ TEST(SoapFaultTest, AnyOtherCodeIsToldAsItWasReceived) {
   }
 }
 
-TEST(SoapFaultTest, AnExpiredPasswordIsToldByThePrefixOfTheText) {
+TEST(SoapFaultTest, AnExpiredPasswordIsRecognisedByThePrefixOfTheText) {
   EXPECT_EQ(ThrownFor(Envelope(Fault("wst:FailedAuthentication", kExpired))),
             Expect<PasswordExpiredException>(
                 "Authentication failed: Password of the user logging on is expired"));
@@ -107,7 +105,7 @@ TEST(SoapFaultTest, AnExpiredPasswordIsToldByThePrefixOfTheText) {
           "Authentication failed: Password of the user logging on is expired. :: alice"));
 }
 
-TEST(SoapFaultTest, TheExpiryTextElsewhereIsNoExpiredPassword) {
+TEST(SoapFaultTest, TheExpiryTextElsewhereIsNotAnExpiredPassword) {
   const std::string later = "Sorry: " + std::string(kExpired);
   EXPECT_EQ(ThrownFor(Envelope(Fault("wst:FailedAuthentication", later))),
             Expect<InvalidCredentialsException>("Authentication failed: " + later));
@@ -145,4 +143,4 @@ TEST(SoapFaultTest, OnlyTheFirstFaultCodeAndTheFirstFaultStringCount) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

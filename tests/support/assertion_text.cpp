@@ -1,12 +1,22 @@
 #include "support/assertion_text.h"
 
+#include <algorithm>
+#include <cstddef>
 #include <stdexcept>
+#include <string>
+#include <string_view>
+#include <utility>
 
+#include <devsts/certificates.h>
+#include <devsts/xml_security.h>
+#include <tarnik/core/ref.h>
 #include <tarnik/crypto/certificate.h>
+#include <tarnik/system/date_time.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 
 #include "deployment.h"
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::System::DateTime;
@@ -60,9 +70,9 @@ std::string ValueText(const std::string& value) {
 std::string AttributeStatementText() {
   const std::string claims = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/";
   return "<saml2:AttributeStatement>" +
-         AttributeText(SsoClient::kGroupIdentityAttribute,
+         AttributeText(kGroupIdentityAttribute,
                        ValueText("EXAMPLE\\staff") + ValueText("EXAMPLE\\admins")) +
-         AttributeText(SsoClient::kIsSolutionAttribute, ValueText("false")) +
+         AttributeText(kIsSolutionAttribute, ValueText("false")) +
          AttributeText(claims + "givenname", ValueText("Alice")) +
          AttributeText(claims + "surname", ValueText("Archer")) + "</saml2:AttributeStatement>";
 }
@@ -79,7 +89,7 @@ DevSts::Credential MakeCredential() {
 std::string NamespaceDeclarations() {
   return R"(xmlns:saml2="urn:oasis:names:tc:SAML:2.0:assertion" )"
          R"(xmlns:ds="http://www.w3.org/2000/09/xmldsig#" xmlns:rsa=")" +
-         std::string(SsoClient::kVendorSamlNamespace) +
+         std::string(kVendorSamlNamespace) +
          R"(" xmlns:del="urn:oasis:names:tc:SAML:2.0:conditions:delegation" )"
          R"(xmlns:xs="http://www.w3.org/2001/XMLSchema" )"
          R"(xmlns:xsi="http://www.w3.org/2001/XMLSchema-instance")";
@@ -93,7 +103,7 @@ std::string Replaced(std::string text, std::string_view from, std::string_view t
   return text.replace(place, from.size(), to);
 }
 
-std::string InsertedBehind(std::string text, std::string_view anchor, std::string_view addition) {
+std::string InsertedAfter(std::string text, std::string_view anchor, std::string_view addition) {
   return Replaced(std::move(text), anchor, std::string(anchor).append(addition));
 }
 
@@ -198,4 +208,4 @@ Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> TrustedResolver() {
       Tarnik::Crypto::CreateCertificatesFromPem(TrustedCredential().certificatePem));
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing

@@ -1,17 +1,18 @@
 #ifndef SSOCLIENT_TESTS_SUPPORT_ASYNC_CALL_H
 #define SSOCLIENT_TESTS_SUPPORT_ASYNC_CALL_H
 
-#include <ssoclient/security_token_service.h>
-#include <tarnik/core/exception.h>
-
 #include <future>
 #include <memory>
 #include <string>
 #include <typeinfo>
 
+#include <ssoclient/saml_token.h>
+#include <ssoclient/security_token_service.h>
+#include <tarnik/core/exception.h>
+
 namespace SsoClient::Testing {
 
-/// What a callback was given.
+/// What a callback received.
 struct Report {
   std::shared_ptr<const SamlToken> token;
   std::string errorType;

@@ -1,14 +1,21 @@
 #ifndef SSOCLIENT_TESTS_SUPPORT_FAKE_SAML_TOKEN_H
 #define SSOCLIENT_TESTS_SUPPORT_FAKE_SAML_TOKEN_H
 
+#include <set>
 #include <string>
 #include <utility>
+#include <vector>
 
+#include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/system/date_time.h>
+#include <tarnik/xml/security/signature.h>
 
 namespace SsoClient::Testing {
 
-/// A token that is nothing but its text, its subject's name and what a test sets.
+/// A token with a text, a subject and the values that a test sets.
 class FakeSamlToken final : public SamlToken {
  public:
   explicit FakeSamlToken(std::string xml, std::string subjectName = "alice")

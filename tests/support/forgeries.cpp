@@ -1,10 +1,13 @@
 #include "support/forgeries.h"
 
+#include <cstddef>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "support/assertion_text.h"
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 namespace {
 
 AssertionText ForgedText(ForgedId id) {
@@ -19,13 +22,13 @@ AssertionText ForgedText(ForgedId id) {
   return text;
 }
 
-// `xml` with `content` in front of the last `endTag`, or "" if there is none.
+// `xml` with `content` before the last `endTag`, or "" if it has no such tag.
 std::string AtEndOf(const std::string& xml, std::string_view endTag, const std::string& content) {
   const std::size_t at = xml.rfind(endTag);
   return at == std::string::npos ? "" : xml.substr(0, at) + content + xml.substr(at);
 }
 
-// The signature's own prefix is "" where the second opinion has made it.
+// A signature made by the independent implementation has no prefix.
 std::string AtEndOfSignature(const std::string& xml, const std::string& content) {
   const std::string prefixed = AtEndOf(xml, "</ds:Signature>", content);
   return prefixed.empty() ? AtEndOf(xml, "</Signature>", content) : prefixed;
@@ -35,7 +38,7 @@ std::string InDs(const std::string& localName, const std::string& content) {
   return "<ds:" + localName + ">" + content + "</ds:" + localName + ">";
 }
 
-// In the KeyInfo that the signature has, or else in one of its own.
+// In the KeyInfo of the signature, which is added if it is missing.
 std::string InKeyInfo(const std::string& xml, const std::string& content) {
   for (const char* endTag : {"</ds:KeyInfo>", "</KeyInfo>"}) {
     const std::string result = AtEndOf(xml, endTag, content);
@@ -154,4 +157,4 @@ std::string Arranged(Place place, const std::string& forged, const std::string& 
   return "";
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing

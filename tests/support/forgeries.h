@@ -1,16 +1,16 @@
-#ifndef SSOCLIENT_TESTS_FORGERIES_H
-#define SSOCLIENT_TESTS_FORGERIES_H
+#ifndef SSOCLIENT_TESTS_SUPPORT_FORGERIES_H
+#define SSOCLIENT_TESTS_SUPPORT_FORGERIES_H
 
 #include <string>
 #include <vector>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
 enum class ForgedId { kSame, kNew, kNone };
 enum class ForgedSignature { kOriginal, kStranger, kUnsigned, kMadeUp };
 
-/// Where the forged assertion and the signed original stand, one to the other: "parent" is the
-/// forged one around the original, "child" the forged one inside of it.
+/// The arrangement of the forged assertion and the signed original: with "parent" the forged one
+/// contains the original, with "child" the original contains the forged one.
 enum class Place {
   kBefore,
   kAfter,
@@ -34,16 +34,16 @@ const std::vector<Place>& AllPlaces();
 const std::vector<ForgedId>& AllForgedIds();
 const std::vector<ForgedSignature>& AllForgedSignatures();
 
-/// An assertion of alice's, signed by the trusted credential with its certificate in KeyInfo.
+/// An assertion about alice, signed by the trusted credential with its certificate in KeyInfo.
 std::string OriginalAssertion();
-/// The ds:Signature of a signed assertion, its own or the first in it.
+/// The first ds:Signature in a signed assertion.
 std::string SignatureOf(const std::string& assertion);
-/// An assertion of admin's.
+/// An assertion about admin.
 std::string ForgedAssertion(ForgedId id, ForgedSignature signature, const std::string& original);
-/// A document with both, or "" when they cannot stand so: an unsigned forgery has no signature to
-/// hide the original in.
+/// A document with both, or "" if this arrangement is impossible: an unsigned forgery has no
+/// signature to hide the original in.
 std::string Arranged(Place place, const std::string& forged, const std::string& original);
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

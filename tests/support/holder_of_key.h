@@ -1,8 +1,12 @@
 #ifndef SSOCLIENT_TESTS_SUPPORT_HOLDER_OF_KEY_H
 #define SSOCLIENT_TESTS_SUPPORT_HOLDER_OF_KEY_H
 
+#include <chrono>
+
 #include <devsts/certificates.h>
 #include <ssoclient/holder_of_key_config.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/private_key.h>
 
 namespace SsoClient::Testing {
 

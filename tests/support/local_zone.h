@@ -6,9 +6,9 @@
 #include <optional>
 #include <string>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
-/// While it lives, the process's local zone is 5:30 ahead of UTC.
+/// During its lifetime, the local time zone of the process is 5:30 ahead of UTC.
 class LocalZone {
  public:
   LocalZone() {
@@ -29,6 +29,6 @@ class LocalZone {
   std::optional<std::string> before_;
 };
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,15 +1,17 @@
 #include "support/second_opinion.h"
 
-#include <devsts/xml_security.h>
-
+#include <cstddef>
 #include <regex>
+#include <string>
+
+#include <devsts/xml_security.h>
 
 #include "support/assertion_text.h"
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 namespace {
 
-// The attribute that the parser complains of, "xmlns" or "xmlns:p"; "" for another complaint.
+// The attribute that the parser's error message names, "xmlns" or "xmlns:p"; "" for another error.
 std::string ComplaintOfNamespace(const std::string& complaint) {
   const std::size_t begin = complaint.find(": xmlns");
   const std::size_t end = begin == std::string::npos ? begin : complaint.find(": '", begin + 2);
@@ -19,8 +21,8 @@ std::string ComplaintOfNamespace(const std::string& complaint) {
   return complaint.substr(begin + 2, end - begin - 2);
 }
 
-// Replaces every declaration of the prefix that the parser's complaint names, but for those that a
-// good text has; false when it is another complaint or there is none to replace.
+// Replaces every declaration of the prefix that the parser's error message names, except those of a
+// well-formed text. Returns false for another error and if there is nothing to replace.
 bool ReplaceMalformedNamespace(std::string& xml, const std::string& complaint) {
   const std::string attribute = ComplaintOfNamespace(complaint);
   if (attribute.empty()) {
@@ -59,4 +61,4 @@ std::string SecondOpinionOf(std::string xml) {
   }
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing

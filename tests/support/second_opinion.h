@@ -1,18 +1,18 @@
-#ifndef SSOCLIENT_TESTS_SECOND_OPINION_H
-#define SSOCLIENT_TESTS_SECOND_OPINION_H
+#ifndef SSOCLIENT_TESTS_SUPPORT_SECOND_OPINION_H
+#define SSOCLIENT_TESTS_SUPPORT_SECOND_OPINION_H
 
 #include <string>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
-/// What an independent reader of XML signatures says against the text's first signature under the
-/// trusted credential's key; "" when it finds nothing wrong.
+/// The error of an independent verifier of XML signatures for the text's first signature with the
+/// trusted credential's key; "" if it is valid.
 ///
-/// XML leaves the URIs of namespaces free, while the other parser refuses a text in which one is
-/// malformed, whatever it is for. Such a URI is replaced by a good one and the opinion asked again:
-/// where the signature or a name depends on the URI, the opinion is then bad as it should be.
+/// XML does not restrict namespace URIs, but the other parser refuses every text with a malformed
+/// one. Such a URI is replaced by a valid one before another attempt. If the signature or a name
+/// depends on the URI, that attempt fails as it should.
 std::string SecondOpinionOf(std::string xml);
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

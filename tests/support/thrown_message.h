@@ -1,5 +1,5 @@
-#ifndef SSOCLIENT_TESTS_THROWN_MESSAGE_H
-#define SSOCLIENT_TESTS_THROWN_MESSAGE_H
+#ifndef SSOCLIENT_TESTS_SUPPORT_THROWN_MESSAGE_H
+#define SSOCLIENT_TESTS_SUPPORT_THROWN_MESSAGE_H
 
 #include <exception>
 #include <string>
@@ -8,10 +8,10 @@
 
 #include <tarnik/core/throwable.h>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
 /// The message of the exception that `action` throws if its class is exactly `Expected`, else a
-/// text that says what happened instead.
+/// text that describes what happened instead.
 template <class Expected, class Action>
 std::string ThrownMessage(Action&& action) {
   try {
@@ -24,6 +24,6 @@ std::string ThrownMessage(Action&& action) {
   return "Nothing was thrown.";
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,15 +1,20 @@
 #include "support/token_editor.h"
 
 #include <array>
+#include <cstddef>
+#include <functional>
+#include <string>
 #include <utility>
+
+#include <devsts/xml_security.h>
 
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 namespace {
 
-// What a canonical form may or may not see.
+// What may or may not change a canonical form.
 constexpr std::array kSnippets{" ",
                                "\t",
                                "\r\n",
@@ -49,8 +54,8 @@ constexpr std::array kSnippets{" ",
                                "#",
                                "<!DOCTYPE a>"};
 
-// An element that begins at or behind `from`, as far as the tag that first closes its name.
-std::pair<std::size_t, std::size_t> ElementBehind(const std::string& xml, std::size_t from) {
+// An element that begins at or after `from`, up to the first end tag of its name.
+std::pair<std::size_t, std::size_t> ElementAfter(const std::string& xml, std::size_t from) {
   std::size_t begin = xml.find('<', from);
   while (begin != std::string::npos && begin + 1 < xml.size() && xml[begin + 1] == '/') {
     begin = xml.find('<', begin + 1);
@@ -123,7 +128,7 @@ std::string TokenEditor::Snippet() {
   return kSnippets[below_(kSnippets.size())];
 }
 
-// Mostly something short; now and then a whole forged assertion or its signature.
+// Mostly something short, sometimes a whole forged assertion or its signature.
 std::string TokenEditor::Insertion() {
   if (below_(8) != 0) {
     return Snippet();
@@ -134,7 +139,7 @@ std::string TokenEditor::Insertion() {
   return below_(2) == 0 ? forged : SignatureOf(forged);
 }
 
-// Behind a tag, inside of its end, or at either end of the text: where edits may be harmless.
+// After a tag, before its end, or at either end of the text, where edits may be harmless.
 void TokenEditor::InsertAtTag(std::string& xml) {
   const std::size_t from = below_(xml.size() + 1);
   const std::size_t tag = xml.find('>', from);
@@ -149,9 +154,9 @@ void TokenEditor::InsertAtTag(std::string& xml) {
   xml.insert(place, Insertion());
 }
 
-// Takes an element out or copies it, and puts it behind another tag.
+// Moves or copies an element to the place after another tag.
 void TokenEditor::MoveElement(std::string& xml) {
-  const auto [begin, end] = ElementBehind(xml, below_(xml.size()));
+  const auto [begin, end] = ElementAfter(xml, below_(xml.size()));
   const std::string element = xml.substr(begin, end - begin);
   if (below_(2) == 0) {
     xml.erase(begin, end - begin);
@@ -160,4 +165,4 @@ void TokenEditor::MoveElement(std::string& xml) {
   xml.insert(tag == std::string::npos ? xml.size() : tag + 1, element);
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing

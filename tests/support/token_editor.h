@@ -1,17 +1,17 @@
-#ifndef SSOCLIENT_TESTS_TOKEN_EDITOR_H
-#define SSOCLIENT_TESTS_TOKEN_EDITOR_H
+#ifndef SSOCLIENT_TESTS_SUPPORT_TOKEN_EDITOR_H
+#define SSOCLIENT_TESTS_SUPPORT_TOKEN_EDITOR_H
 
 #include <cstddef>
 #include <functional>
 #include <string>
 
-namespace TestSupport {
+namespace SsoClient::Testing {
 
-/// Makes signed assertions of every kind and edits them, as a source of numbers decides: by chance,
-/// or by a fuzzer's input.
+/// Makes signed assertions of every kind and edits them. A source of numbers makes the choices:
+/// random numbers, or the input of a fuzzer.
 class TokenEditor {
  public:
-  /// `below` gives a number below its argument, which is at least one.
+  /// `below` returns a number less than its argument, which is at least one.
   explicit TokenEditor(std::function<std::size_t(std::size_t)> below);
 
   /// An assertion signed by the trusted credential.
@@ -28,6 +28,6 @@ class TokenEditor {
   std::function<std::size_t(std::size_t)> below_;
 };
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,26 +1,26 @@
 #include "support/token_values.h"
 
-#include <tarnik/crypto/certificate.h>
-
 #include <set>
+#include <string>
 #include <vector>
 
-namespace TestSupport {
+#include <ssoclient/principal_id.h>
+#include <ssoclient/saml_token.h>
+
+namespace SsoClient::Testing {
 namespace {
 
-using SsoClient::SamlToken;
-
-// With its length in front, so that no two lists of values give one text.
+// Prefixed with its length, so that different lists of values give different texts.
 void Add(std::string& text, const std::string& value) {
   text += std::to_string(value.size()) + ":" + value + ";";
 }
 
 void AddAdvice(std::string& text, const SamlToken& token) {
-  std::vector<SsoClient::Advice> advice;
+  std::vector<Advice> advice;
   token.GetAdvice(advice);
-  for (const SsoClient::Advice& block : advice) {
+  for (const Advice& block : advice) {
     Add(text, "source " + block.source);
-    for (const SsoClient::AdviceAttribute& attribute : block.attributes) {
+    for (const AdviceAttribute& attribute : block.attributes) {
       Add(text, "name " + attribute.name);
       for (const std::string& value : attribute.values) {
         Add(text, value);
@@ -29,21 +29,21 @@ void AddAdvice(std::string& text, const SamlToken& token) {
   }
 }
 
-void AddPrincipal(std::string& text, const SsoClient::PrincipalId& principal) {
+void AddPrincipal(std::string& text, const PrincipalId& principal) {
   Add(text, principal.name);
   Add(text, principal.domain);
 }
 
 void AddPrincipals(std::string& text, const SamlToken& token) {
   AddPrincipal(text, token.Subject());
-  std::vector<SsoClient::PrincipalId> groups;
+  std::vector<PrincipalId> groups;
   token.GetGroups(groups);
-  for (const SsoClient::PrincipalId& group : groups) {
+  for (const PrincipalId& group : groups) {
     AddPrincipal(text, group);
   }
-  std::vector<SsoClient::Delegate> chain;
+  std::vector<Delegate> chain;
   token.GetDelegationChain(chain);
-  for (const SsoClient::Delegate& delegate : chain) {
+  for (const Delegate& delegate : chain) {
     AddPrincipal(text, delegate.delegate);
     Add(text, delegate.delegationInstant.ToString());
   }
@@ -57,7 +57,7 @@ std::string AllValues(const SamlToken& token) {
   Add(text, token.Issuer());
   Add(text, token.StartTime().ToString());
   Add(text, token.ExpirationTime().ToString());
-  SsoClient::SubjectNames names;
+  SubjectNames names;
   token.GetSubjectNames(names);
   Add(text, names.givenName);
   Add(text, names.surname);
@@ -75,4 +75,4 @@ std::string AllValues(const SamlToken& token) {
   return text;
 }
 
-}  // namespace TestSupport
+}  // namespace SsoClient::Testing

@@ -1,16 +1,16 @@
-#ifndef SSOCLIENT_TESTS_TOKEN_VALUES_H
-#define SSOCLIENT_TESTS_TOKEN_VALUES_H
-
-#include <ssoclient/saml_token.h>
+#ifndef SSOCLIENT_TESTS_SUPPORT_TOKEN_VALUES_H
+#define SSOCLIENT_TESTS_SUPPORT_TOKEN_VALUES_H
 
 #include <string>
 
-namespace TestSupport {
+#include <ssoclient/saml_token.h>
 
-/// Everything that a token tells but its text, in one text: two tokens that tell the same give the
-/// same.
-std::string AllValues(const SsoClient::SamlToken& token);
+namespace SsoClient::Testing {
 
-}  // namespace TestSupport
+/// All values of a token except its text, in one string: tokens with the same values give the same
+/// string.
+std::string AllValues(const SamlToken& token);
+
+}  // namespace SsoClient::Testing
 
 #endif

@@ -1,18 +1,19 @@
 #include "token/advice_reader.h"
 
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
 
-#include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/fragment.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::Fragment;
-using TestSupport::ThrownMessage;
-
-TEST(ReadAdvice, ReadsBlocksAttributesAndValuesInOrder) {
+TEST(ReadAdviceTest, ReadsBlocksAttributesAndValuesInOrder) {
   Fragment fragment(
       R"(<saml2:Advice><rsa:RSAAdvice AdviceSource="urn:s"><saml2:Attribute Name="a">)"
       R"(<saml2:AttributeValue>1</saml2:AttributeValue>)"
@@ -32,7 +33,7 @@ TEST(ReadAdvice, ReadsBlocksAttributesAndValuesInOrder) {
   EXPECT_TRUE(fragment.Cursor().IsAtElement("next"));
 }
 
-TEST(ReadAdvice, ReadsEmptyValuesAndNames) {
+TEST(ReadAdviceTest, ReadsEmptyValuesAndNames) {
   Fragment fragment(
       R"(<saml2:Advice><rsa:RSAAdvice AdviceSource="urn:s"><saml2:Attribute Name="">)"
       R"(<saml2:AttributeValue xsi:type="xs:string"></saml2:AttributeValue>)"
@@ -46,12 +47,12 @@ TEST(ReadAdvice, ReadsEmptyValuesAndNames) {
   EXPECT_EQ(advice[0].attributes[0].values, (std::vector<std::string>{"", " ", ""}));
 }
 
-TEST(ReadAdvice, ReadsNoAdvice) {
+TEST(ReadAdviceTest, ReadsNoAdvice) {
   Fragment fragment("<saml2:Advice/>");
   EXPECT_TRUE(ReadAdvice(fragment.Cursor()).empty());
 }
 
-TEST(ReadAdvice, RefusesByTheReadingRules) {
+TEST(ReadAdviceTest, RefusesByTheReadingRules) {
   const std::pair<const char*, const char*> cases[] = {
       {"<rsa:Advice/>", "Element 'rsa:Advice' has unexpected namespace"},
       {"<saml2:Advice x=\"\"/>", "Unexpected attributes on element 'saml2:Advice'"},
@@ -74,4 +75,4 @@ TEST(ReadAdvice, RefusesByTheReadingRules) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

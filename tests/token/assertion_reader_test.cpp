@@ -1,19 +1,21 @@
 #include "token/assertion_reader.h"
 
+#include <cstddef>
+#include <string>
+#include <string_view>
+#include <tuple>
+#include <utility>
+
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
+#include <tarnik/system/date_time.h>
 
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/parse_xml.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
-
-using TestSupport::AssertionText;
-using TestSupport::MadeUpSignature;
-using TestSupport::ParseXml;
-using TestSupport::Replaced;
-using TestSupport::ThrownMessage;
 
 const Tarnik::System::DateTime kNow = Tarnik::System::DateTime::Parse("2024-03-05T07:01:00Z");
 
@@ -48,11 +50,11 @@ void ExpectAllValues(const ParsedAssertion& parsed) {
   EXPECT_EQ(parsed.attributes.names.surname, "Archer");
 }
 
-TEST(ReadAssertion, ReadsEveryPart) {
+TEST(ReadAssertionTest, ReadsEveryPart) {
   ExpectAllValues(Read(AssertionText(kNow).ToXml()));
 }
 
-TEST(ReadAssertion, SkipsBlankLinesTabsAndCommentsBetweenParts) {
+TEST(ReadAssertionTest, SkipsBlankLinesTabsAndCommentsBetweenParts) {
   AssertionText text(kNow);
   for (std::string* part : {&text.issuer, &text.signature, &text.subject, &text.conditions,
                             &text.advice, &text.authnStatement, &text.attributeStatement}) {
@@ -62,7 +64,7 @@ TEST(ReadAssertion, SkipsBlankLinesTabsAndCommentsBetweenParts) {
   ExpectAllValues(Read(text.ToXml()));
 }
 
-TEST(ReadAssertion, ReadsAnyPrefixAndTheDefaultNamespace) {
+TEST(ReadAssertionTest, ReadsAnyPrefixAndTheDefaultNamespace) {
   std::string xml = AssertionText(kNow).ToXml();
   const auto replaceAll = [&](std::string_view from, std::string_view to) {
     for (std::size_t at = 0; (at = xml.find(from, at)) != std::string::npos; at += to.size()) {
@@ -75,7 +77,7 @@ TEST(ReadAssertion, ReadsAnyPrefixAndTheDefaultNamespace) {
   ExpectAllValues(Read(xml));
 }
 
-TEST(ReadAssertion, LetsAdviceAndStatementsBeAbsent) {
+TEST(ReadAssertionTest, LetsAdviceAndStatementsBeAbsent) {
   for (int present = 0; present < 8; ++present) {
     AssertionText text(kNow);
     if ((present & 1) == 0) {
@@ -94,7 +96,7 @@ TEST(ReadAssertion, LetsAdviceAndStatementsBeAbsent) {
   }
 }
 
-TEST(ReadAssertion, RefusesANonBlankCharacterBetweenParts) {
+TEST(ReadAssertionTest, RefusesANonBlankCharacterBetweenParts) {
   const std::pair<std::string AssertionText::*, const char*> cases[] = {
       {&AssertionText::issuer, "Expected element 'Issuer' not found."},
       {&AssertionText::signature, "Expected element ds:Signature not found"},
@@ -113,7 +115,7 @@ TEST(ReadAssertion, RefusesANonBlankCharacterBetweenParts) {
   }
 }
 
-TEST(ReadAssertion, RefusesMissingRequiredParts) {
+TEST(ReadAssertionTest, RefusesMissingRequiredParts) {
   const std::pair<std::string AssertionText::*, const char*> cases[] = {
       {&AssertionText::issuer, "Expected element 'Issuer' not found."},
       {&AssertionText::subject, "Expected element 'Subject' not found."},
@@ -123,13 +125,13 @@ TEST(ReadAssertion, RefusesMissingRequiredParts) {
     (text.*part).clear();
     EXPECT_EQ(Refusal(text.ToXml()), message);
   }
-  EXPECT_EQ(Refusal("<saml2:Assertion " + TestSupport::NamespaceDeclarations() + " " +
-                    AssertionText(kNow).attributes + ">" + AssertionText(kNow).issuer +
-                    "</saml2:Assertion>"),
-            "Expected element ds:Signature not found");
+  EXPECT_EQ(
+      Refusal("<saml2:Assertion " + NamespaceDeclarations() + " " + AssertionText(kNow).attributes +
+              ">" + AssertionText(kNow).issuer + "</saml2:Assertion>"),
+      "Expected element ds:Signature not found");
 }
 
-TEST(ReadAssertion, RefusesElementsBehindTheLastStatement) {
+TEST(ReadAssertionTest, RefusesElementsAfterTheLastStatement) {
   for (const char* tail : {"<saml2:AttributeStatement/>", "<saml2:AuthzDecisionStatement/>", "<x/>",
                            "<saml2:Issuer>i</saml2:Issuer>"}) {
     AssertionText text(kNow);
@@ -141,7 +143,7 @@ TEST(ReadAssertion, RefusesElementsBehindTheLastStatement) {
   EXPECT_EQ(Refusal(second.ToXml()), "Unexpected elements under Assertion");
 }
 
-TEST(ReadAssertion, RefusesAnotherOrder) {
+TEST(ReadAssertionTest, RefusesAnotherOrder) {
   AssertionText statements(kNow);
   std::swap(statements.authnStatement, statements.attributeStatement);
   EXPECT_EQ(Refusal(statements.ToXml()), "Unexpected elements under Assertion");
@@ -156,7 +158,7 @@ TEST(ReadAssertion, RefusesAnotherOrder) {
   EXPECT_EQ(Refusal(signature.ToXml()), "Expected element 'Issuer' not found.");
 }
 
-TEST(ReadAssertion, RefusesStatementsOfAnotherNamespaceByName) {
+TEST(ReadAssertionTest, RefusesStatementsOfAnotherNamespaceByName) {
   for (const char* name : {"Advice", "AuthnStatement", "AttributeStatement"}) {
     AssertionText text(kNow);
     text.advice.clear();
@@ -167,7 +169,7 @@ TEST(ReadAssertion, RefusesStatementsOfAnotherNamespaceByName) {
   }
 }
 
-TEST(ReadAssertion, RefusesAnotherRoot) {
+TEST(ReadAssertionTest, RefusesAnotherRoot) {
   EXPECT_EQ(Refusal("<Response/>"), "Expected element 'Assertion' not found.");
   EXPECT_EQ(Refusal("<Assertion/>"), "Element 'Assertion' has unexpected namespace");
   EXPECT_EQ(Refusal(R"(<s:Assertion xmlns:s="urn:oasis:names:tc:SAML:1.0:assertion"/>)"),
@@ -176,13 +178,13 @@ TEST(ReadAssertion, RefusesAnotherRoot) {
             "Expected element 'Assertion' not found.");
 }
 
-TEST(ReadAssertion, AcceptsFurtherNamespaceDeclarations) {
+TEST(ReadAssertionTest, AcceptsFurtherNamespaceDeclarations) {
   AssertionText text(kNow);
   text.attributes += R"( xmlns="urn:default" xmlns:other="urn:other")";
   ExpectAllValues(Read(text.ToXml()));
 }
 
-TEST(ReadAssertion, RefusesFurtherAttributes) {
+TEST(ReadAssertionTest, RefusesFurtherAttributes) {
   for (const char* attribute : {" x=\"\"", " xml:lang=\"en\"", " xml:id=\"_a1\"", " Id=\"_a1\"",
                                 " xsi:type=\"saml2:AssertionType\"", " saml2:ID=\"_a1\""}) {
     AssertionText text(kNow);
@@ -191,7 +193,7 @@ TEST(ReadAssertion, RefusesFurtherAttributes) {
   }
 }
 
-TEST(ReadAssertion, RefusesMissingOrBrokenAttributes) {
+TEST(ReadAssertionTest, RefusesMissingOrBrokenAttributes) {
   const std::tuple<const char*, const char*, const char*> cases[] = {
       {" Version=\"2.0\"", "", "Node 'saml2:Assertion is missing required attribute 'Version'"},
       {"ID=\"_a1\" ", "", "Node 'saml2:Assertion is missing required attribute 'ID'"},
@@ -206,7 +208,7 @@ TEST(ReadAssertion, RefusesMissingOrBrokenAttributes) {
   }
 }
 
-TEST(ReadAssertion, NamesTheFirstFaultInReadingOrder) {
+TEST(ReadAssertionTest, NamesTheFirstFaultInReadingOrder) {
   AssertionText text(kNow);
   text.subject = "<x/>";
   text.conditions = "<y/>";
@@ -225,8 +227,8 @@ struct Fault {
   const char* message;
 };
 
-// Every part is broken: each message shows once the parts before are repaired.
-TEST(ReadAssertion, ReadsItsPartsInTheirOrder) {
+// Every part is broken. Each message appears once the parts before it are repaired.
+TEST(ReadAssertionTest, ReadsItsPartsInTheirOrder) {
   const Fault faults[] = {
       {&AssertionText::attributes, R"(ID="_a1" Version="2.0" IssueInstant="soon")",
        "saml2:Assertion/@IssueInstant is not a date"},
@@ -256,4 +258,4 @@ TEST(ReadAssertion, ReadsItsPartsInTheirOrder) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

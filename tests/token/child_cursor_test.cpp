@@ -1,14 +1,56 @@
 #include "token/child_cursor.h"
 
-#include "support/parsed_xml.h"
+#include <memory>
+#include <string>
+
+#include <gtest/gtest.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/xml/character_nodes.h>
+
+#include "support/fragment.h"
+#include "support/parse_xml.h"
 #include "token/strict_rules.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::Fragment;
+bool IsFirstChildVisible(const std::string& content) {
+  const auto document = ParseXml("<r>" + content + "</r>");
+  return SkipWsAndCommentsFilter().IsVisible(*document->RootElement()->FirstChild());
+}
 
-TEST(ChildCursor, WalksVisibleChildrenInOrder) {
+TEST(SkipWsAndCommentsFilterTest, HidesComments) {
+  EXPECT_FALSE(IsFirstChildVisible("<!--text-->"));
+  EXPECT_FALSE(IsFirstChildVisible("<!---->"));
+}
+
+TEST(SkipWsAndCommentsFilterTest, HidesTextOfWhiteSpaceOnly) {
+  EXPECT_FALSE(IsFirstChildVisible(" "));
+  EXPECT_FALSE(IsFirstChildVisible("\t"));
+  EXPECT_FALSE(IsFirstChildVisible("\n"));
+  EXPECT_FALSE(IsFirstChildVisible("&#13;"));
+  EXPECT_FALSE(IsFirstChildVisible("\t\n &#13; \n"));
+  EXPECT_FALSE(IsFirstChildVisible("<![CDATA[  ]]>"));
+}
+
+TEST(SkipWsAndCommentsFilterTest, HidesEmptyText) {
+  Tarnik::Ref<Tarnik::Xml::TextNode> text;
+  Tarnik::Xml::CreateTextNode(text);
+  EXPECT_FALSE(SkipWsAndCommentsFilter().IsVisible(*text));
+}
+
+TEST(SkipWsAndCommentsFilterTest, ShowsOtherText) {
+  EXPECT_TRUE(IsFirstChildVisible("x"));
+  EXPECT_TRUE(IsFirstChildVisible("\n x"));
+  EXPECT_TRUE(IsFirstChildVisible("\xC2\xA0"));  // a no-break space is not white space in XML
+}
+
+TEST(SkipWsAndCommentsFilterTest, ShowsElementsAndProcessingInstructions) {
+  EXPECT_TRUE(IsFirstChildVisible("<e/>"));
+  EXPECT_TRUE(IsFirstChildVisible("<?target?>"));
+}
+
+TEST(ChildCursorTest, WalksVisibleChildrenInOrder) {
   Fragment fragment(" <!--c--> <a/>\n<b/>text<c/> <!--d-->");
   ChildCursor& cursor = fragment.Cursor();
   EXPECT_TRUE(cursor.IsAtElement("a"));
@@ -26,19 +68,19 @@ TEST(ChildCursor, WalksVisibleChildrenInOrder) {
   EXPECT_FALSE(cursor.IsAtElement("c"));
 }
 
-TEST(ChildCursor, IsAtEndWhenNothingIsVisible) {
+TEST(ChildCursorTest, IsAtEndWhenNothingIsVisible) {
   EXPECT_TRUE(Fragment("").Cursor().IsAtEnd());
   EXPECT_TRUE(Fragment(" <!--c--> ").Cursor().IsAtEnd());
 }
 
-TEST(ChildCursor, GoesIntoAnElementWithTheSameFilter) {
+TEST(ChildCursorTest, GoesIntoAnElementWithTheSameFilter) {
   Fragment fragment("<a> <!--c--><b/></a>");
   const ChildCursor inner = fragment.Cursor().Into(fragment.Element());
   EXPECT_EQ(&inner.Parent(), &fragment.Element());
   EXPECT_TRUE(inner.IsAtElement("b"));
 }
 
-// Shows elements only, and counts what it is asked.
+// Shows only elements, and counts its calls.
 class ElementsOnly final : public NodeFilter {
  public:
   bool IsVisible(const Tarnik::Xml::Node& node) const override {
@@ -49,7 +91,7 @@ class ElementsOnly final : public NodeFilter {
   mutable int asked = 0;
 };
 
-TEST(ChildCursor, SharesOneFilterOfAnyKind) {
+TEST(ChildCursorTest, SharesOneFilterOfAnyKind) {
   Fragment fragment("text<a>text<b/></a>");
   const auto filter = std::make_shared<const ElementsOnly>();
   const ChildCursor outer(fragment.Root(), filter);
@@ -62,4 +104,4 @@ TEST(ChildCursor, SharesOneFilterOfAnyKind) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

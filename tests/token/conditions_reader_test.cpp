@@ -1,17 +1,18 @@
 #include "token/conditions_reader.h"
 
+#include <string>
+#include <tuple>
+#include <vector>
+
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
 
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/fragment.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
-
-using TestSupport::Fragment;
-using TestSupport::Replaced;
-using TestSupport::ThrownMessage;
 
 constexpr char kUnknownOrDuplicate[] = "Unknown or duplicate restriction node under Conditions";
 constexpr char kAudiences[] =
@@ -50,7 +51,7 @@ std::string Refusal(const std::string& restrictions) {
   return ThrownMessage<ParseException>([&] { Read(restrictions); });
 }
 
-TEST(ReadConditions, ReadsThePeriodAlone) {
+TEST(ReadConditionsTest, ReadsOnlyThePeriod) {
   const ParsedConditions conditions = Read(" <!--none--> ");
   EXPECT_EQ(conditions.notBefore.ToString(), "2024-03-05T07:00:00.000Z");
   EXPECT_EQ(conditions.notOnOrAfter.ToString(), "2024-03-05T08:00:00.000Z");
@@ -60,7 +61,7 @@ TEST(ReadConditions, ReadsThePeriodAlone) {
   EXPECT_FALSE(conditions.delegationChain.has_value());
 }
 
-TEST(ReadConditions, ReadsEveryRestrictionInAnyOrder) {
+TEST(ReadConditionsTest, ReadsEveryRestrictionInAnyOrder) {
   const std::string forwards = std::string(kAudiences) + kProxy + kRenew + kDelegation;
   const std::string backwards = std::string(kDelegation) + kRenew + kProxy + kAudiences;
   for (const std::string& text : {forwards, backwards}) {
@@ -83,13 +84,13 @@ TEST(ReadConditions, ReadsEveryRestrictionInAnyOrder) {
   }
 }
 
-TEST(ReadConditions, RefusesEachRestrictionTwice) {
+TEST(ReadConditionsTest, RefusesEachRestrictionTwice) {
   for (const std::string restriction : {kAudiences, kProxy, kRenew, kDelegation}) {
     EXPECT_EQ(Refusal(restriction + restriction), kUnknownOrDuplicate);
   }
 }
 
-TEST(ReadConditions, RefusesUnknownNodes) {
+TEST(ReadConditionsTest, RefusesUnknownNodes) {
   for (const char* restriction :
        {"<saml2:OneTimeUse/>", "text", "<?pi?>", "<ds:ProxyRestriction Count=\"1\"/>",
         "<ProxyRestriction Count=\"1\"/>", "<saml2:Condition/>",
@@ -103,7 +104,7 @@ TEST(ReadConditions, RefusesUnknownNodes) {
   }
 }
 
-TEST(ReadConditions, RefusesATypeOfAnUndefinedPrefix) {
+TEST(ReadConditionsTest, RefusesATypeOfAnUndefinedPrefix) {
   EXPECT_EQ(ThrownMessage<ParseException>([] {
               Fragment fragment(
                   "\n<saml2:Conditions NotBefore=\"2024-03-05T07:00:00Z\" "
@@ -114,7 +115,7 @@ TEST(ReadConditions, RefusesATypeOfAnUndefinedPrefix) {
             "Element saml2:Conditionat 3,2 uses undefined prefix: `no'");
 }
 
-TEST(ReadConditions, TellsConditionsByTheTypesExpandedName) {
+TEST(ReadConditionsTest, IdentifiesConditionsByTheTypesExpandedName) {
   const ParsedConditions conditions =
       Read(R"(<saml2:Condition i:type="RenewRestrictionType" Count="5" xmlns="http://sts-vendor.)"
            R"(example/names/2009/12/std-ext/SAML2.0" )"
@@ -124,7 +125,7 @@ TEST(ReadConditions, TellsConditionsByTheTypesExpandedName) {
   EXPECT_FALSE(conditions.renewRestriction->renewExpired);
 }
 
-TEST(ReadConditions, RefusesMissingOrBrokenTimes) {
+TEST(ReadConditionsTest, RefusesMissingOrBrokenTimes) {
   const std::string text = ConditionsText("");
   const std::tuple<const char*, const char*, const char*> cases[] = {
       {R"( NotBefore="2024-03-05T07:00:00Z")", "",
@@ -143,7 +144,7 @@ TEST(ReadConditions, RefusesMissingOrBrokenTimes) {
   }
 }
 
-TEST(ReadConditions, RefusesBrokenAudiences) {
+TEST(ReadConditionsTest, RefusesBrokenAudiences) {
   EXPECT_EQ(Refusal("<saml2:AudienceRestriction/>"), "Expected element 'Audience' not found.");
   EXPECT_EQ(Refusal("<saml2:AudienceRestriction><saml2:Audience>a</saml2:Audience>b"
                     "</saml2:AudienceRestriction>"),
@@ -162,7 +163,7 @@ TEST(ReadConditions, RefusesBrokenAudiences) {
             "Unexpected attributes on element 'saml2:Audience'");
 }
 
-TEST(ReadConditions, RefusesBrokenProxyRestriction) {
+TEST(ReadConditionsTest, RefusesBrokenProxyRestriction) {
   EXPECT_EQ(Refusal("<saml2:ProxyRestriction/>"),
             "Node 'saml2:ProxyRestriction is missing required attribute 'Count'");
   EXPECT_EQ(Refusal(R"(<saml2:ProxyRestriction Count="-1"/>)"),
@@ -174,7 +175,7 @@ TEST(ReadConditions, RefusesBrokenProxyRestriction) {
             "Element 'saml2:ProxyRestriction' must be empty");
 }
 
-TEST(ReadConditions, RefusesBrokenRenewRestriction) {
+TEST(ReadConditionsTest, RefusesBrokenRenewRestriction) {
   const std::string text = kRenew;
   EXPECT_EQ(Refusal(Replaced(text, R"( Count="5")", "")),
             "Node 'saml2:Condition is missing required attribute 'Count'");
@@ -190,7 +191,7 @@ TEST(ReadConditions, RefusesBrokenRenewRestriction) {
             "Element 'saml2:Condition' must be empty");
 }
 
-TEST(ReadConditions, RefusesBrokenDelegationRestriction) {
+TEST(ReadConditionsTest, RefusesBrokenDelegationRestriction) {
   EXPECT_EQ(Refusal(R"(<saml2:Condition xsi:type="del:DelegationRestrictionType"/>)"),
             "Expected element 'Delegate' not found.");
   const std::string open = R"(<saml2:Condition xsi:type="del:DelegationRestrictionType">)";
@@ -221,4 +222,4 @@ TEST(ReadConditions, RefusesBrokenDelegationRestriction) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,41 +1,48 @@
-#include <ssoclient/saml_token.h>
-
+#include <cstddef>
+#include <memory>
+#include <string>
 #include <thread>
+#include <vector>
 
-#include <tarnik/core/object_impl.h>
+#include <devsts/certificates.h>
+#include <devsts/xml_security.h>
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/saml_token.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/system/date_time.h>
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 #include <tarnik/xml/xml_parse_exception.h>
 
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/parse_xml.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::Ref;
 using Tarnik::Xml::ElementNode;
 using Tarnik::Xml::XMLParseException;
 using Tarnik::Xml::Security::KeyInfoResolver;
-using TestSupport::AssertionText;
-using TestSupport::ParseXml;
-using TestSupport::Replaced;
-using TestSupport::ThrownMessage;
-using TestSupport::TimeText;
 
 constexpr char kTampered[] = "Failed to verify signature: token might have been tampered with.";
 
 std::string SignedXml(const AssertionText& text = AssertionText()) {
-  return text.ToSignedXml(TestSupport::TrustedCredential());
+  return text.ToSignedXml(TrustedCredential());
 }
 
 std::string TamperedXml() {
   return Replaced(SignedXml(), "alice@example.com", "admin@example.com");
 }
 
-TEST(CreateSamlToken, AcceptsASignedToken) {
+TEST(CreateSamlTokenTest, AcceptsASignedToken) {
   const std::string xml = SignedXml();
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   EXPECT_EQ(CreateSamlToken(xml)->Subject().name, "alice");
   EXPECT_EQ(CreateSamlToken(xml, 600)->Subject().name, "alice");
   EXPECT_EQ(CreateSamlToken(xml, resolver.get())->Subject().name, "alice");
@@ -44,9 +51,9 @@ TEST(CreateSamlToken, AcceptsASignedToken) {
             "alice");
 }
 
-TEST(CreateSamlTokenFromDom, AcceptsASignedToken) {
+TEST(CreateSamlTokenFromDomTest, AcceptsASignedToken) {
   const auto document = ParseXml(SignedXml());
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   ElementNode* root = document->RootElement();
   EXPECT_EQ(CreateSamlTokenFromDom(root)->Subject().name, "alice");
   EXPECT_EQ(CreateSamlTokenFromDom(root, 600)->Subject().name, "alice");
@@ -54,13 +61,13 @@ TEST(CreateSamlTokenFromDom, AcceptsASignedToken) {
   EXPECT_EQ(CreateSamlTokenFromDom(root, resolver.get(), 600)->Subject().name, "alice");
 }
 
-TEST(CreateSamlToken, AcceptsAnRsaSignatureOverTheWholeDocument) {
+TEST(CreateSamlTokenTest, AcceptsAnRsaSignatureOverTheWholeDocument) {
   DevSts::CertificateSpec spec;
   spec.commonName = "RSA STS";
   spec.keyType = DevSts::KeyType::Rsa2048;
   const DevSts::Credential credential = DevSts::MakeCertificate(spec);
   AssertionText text;
-  text.signature = Replaced(TestSupport::MadeUpSignature(""), "ecdsa-sha256", "rsa-sha256");
+  text.signature = Replaced(MadeUpSignature(""), "ecdsa-sha256", "rsa-sha256");
   text.signature = Replaced(text.signature, "AAECAwQFBgcICQoLDA0ODxAREhMUFRYXGBkaGxwdHh8=", "");
   text.signature = Replaced(text.signature, "AAECAwQF", "");
   const std::string xml =
@@ -79,23 +86,23 @@ std::string TwiceReferencedXml() {
   const std::size_t begin = signature.find("<ds:Reference ");
   const std::size_t end = signature.find("</ds:SignedInfo>");
   signature.insert(end, Replaced(signature.substr(begin, end - begin), "\"#_a1\"", "\"\""));
-  const DevSts::Credential& credential = TestSupport::TrustedCredential();
+  const DevSts::Credential& credential = TrustedCredential();
   return DevSts::SignXml(text.ToXml(), credential.privateKeyPem, credential.certificatePem);
 }
 
-TEST(CreateSamlToken, VerifiesEveryReferenceThoughOneCoversTheToken) {
+TEST(CreateSamlTokenTest, VerifiesEveryReferenceEvenIfOneCoversTheToken) {
   const std::string xml = TwiceReferencedXml();
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   EXPECT_EQ(CreateSamlToken(xml, resolver.get())->Subject().name, "alice");
   const auto inside = ParseXml("<wrapper>" + xml + "</wrapper>");
-  ElementNode* assertion = TestSupport::FindElement(inside->RootElement(), "Assertion");
+  ElementNode* assertion = FindElement(inside->RootElement(), "Assertion");
   EXPECT_EQ(CreateSamlTokenFromDom(assertion)->Subject().name, "alice");
   EXPECT_EQ(ThrownMessage<InvalidSignatureException>(
                 [&] { CreateSamlTokenFromDom(assertion, resolver.get()); }),
             kTampered);
 }
 
-TEST(CreateSamlToken, ChecksTheSignaturesFormAloneWithoutAResolver) {
+TEST(CreateSamlTokenTest, ChecksOnlyTheSignaturesFormWithoutAResolver) {
   const std::string xml = TamperedXml();
   EXPECT_EQ(CreateSamlToken(xml)->Subject().name, "admin");
   EXPECT_EQ(CreateSamlToken(xml, 600)->Subject().name, "admin");
@@ -104,9 +111,9 @@ TEST(CreateSamlToken, ChecksTheSignaturesFormAloneWithoutAResolver) {
   EXPECT_EQ(CreateSamlToken(AssertionText().ToXml())->Subject().name, "alice");
 }
 
-TEST(CreateSamlToken, RefusesATamperedTokenThroughEveryResolver) {
+TEST(CreateSamlTokenTest, RefusesATamperedTokenThroughEveryResolver) {
   const std::string xml = TamperedXml();
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   const auto document = ParseXml(xml);
   EXPECT_EQ(ThrownMessage<InvalidSignatureException>([&] { CreateSamlToken(xml, resolver.get()); }),
             kTampered);
@@ -124,31 +131,31 @@ TEST(CreateSamlToken, RefusesATamperedTokenThroughEveryResolver) {
             kTampered);
 }
 
-TEST(CreateSamlToken, RefusesAnAlteredSignatureValueThroughAResolverAlone) {
+TEST(CreateSamlTokenTest, RefusesAnAlteredSignatureValueOnlyWithAResolver) {
   std::string xml = SignedXml();
   const std::size_t value = xml.find("SignatureValue>") + 20;
   xml[value] = xml[value] == 'A' ? 'B' : 'A';
   EXPECT_EQ(CreateSamlToken(xml)->Subject().name, "alice");
   EXPECT_EQ(ThrownMessage<InvalidSignatureException>(
-                [&] { CreateSamlToken(xml, TestSupport::TrustedResolver().get()); }),
+                [&] { CreateSamlToken(xml, TrustedResolver().get()); }),
             kTampered);
 }
 
-TEST(CreateSamlToken, RefusesAStrangersSignature) {
-  const std::string xml = AssertionText().ToSignedXml(TestSupport::StrangerCredential());
+TEST(CreateSamlTokenTest, RefusesAStrangersSignature) {
+  const std::string xml = AssertionText().ToSignedXml(StrangerCredential());
   EXPECT_EQ(CreateSamlToken(xml)->Subject().name, "alice");
   const std::string message = ThrownMessage<InvalidSignatureException>(
-      [&] { CreateSamlToken(xml, TestSupport::TrustedResolver().get()); });
+      [&] { CreateSamlToken(xml, TrustedResolver().get()); });
   EXPECT_EQ(message.rfind("Signature verification error. ", 0), 0U) << message;
 }
 
-TEST(CreateSamlToken, ReadsTheWholeTokenBeforeItJudgesValidity) {
+TEST(CreateSamlTokenTest, ReadsTheWholeTokenBeforeItChecksValidity) {
   AssertionText text;
   text.attributes = Replaced(text.attributes, "2.0", "1.1");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(text.ToXml()); }),
             "Invalid token version");
   AssertionText uncovered = text;
-  uncovered.signature = TestSupport::MadeUpSignature("#other");
+  uncovered.signature = MadeUpSignature("#other");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(uncovered.ToXml()); }),
             "Token's signature must cover the entire token");
   text.tail = "<x/>";
@@ -156,12 +163,11 @@ TEST(CreateSamlToken, ReadsTheWholeTokenBeforeItJudgesValidity) {
             "Unexpected elements under Assertion");
 }
 
-TEST(CreateSamlToken, JudgesValidityBeforeTheSignature) {
+TEST(CreateSamlTokenTest, ChecksValidityBeforeTheSignature) {
   const auto now = Tarnik::System::GetUtcDateTime();
   const auto longAgo = Tarnik::System::DateTimeFromUtc(now.GetUtcTime() - 7200L * 1'000'000, false);
   const std::string xml = Replaced(SignedXml(AssertionText(longAgo)), "alice@", "admin@");
-  EXPECT_EQ(ThrownMessage<ParseException>(
-                [&] { CreateSamlToken(xml, TestSupport::TrustedResolver().get()); }),
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(xml, TrustedResolver().get()); }),
             "The token has expired at: " + TimeText(longAgo, 3600));
 }
 
@@ -171,7 +177,7 @@ AssertionText TextThatEnds(long secondsAgo) {
       Tarnik::System::DateTimeFromUtc(now.GetUtcTime() - (3600 + secondsAgo) * 1'000'000, false));
 }
 
-TEST(CreateSamlToken, ToleratesTenMinutesUnlessTold) {
+TEST(CreateSamlTokenTest, ToleratesTenMinutesByDefault) {
   const std::string nineMinutes = TextThatEnds(540).ToXml();
   const std::string elevenMinutes = TextThatEnds(660).ToXml();
   EXPECT_NO_THROW(CreateSamlToken(nineMinutes));
@@ -183,7 +189,7 @@ TEST(CreateSamlToken, ToleratesTenMinutesUnlessTold) {
   EXPECT_NO_THROW(CreateSamlTokenFromDom(ParseXml(elevenMinutes)->RootElement(), 720));
 }
 
-TEST(CreateSamlToken, ToleratesAStartTenMinutesAhead) {
+TEST(CreateSamlTokenTest, ToleratesAStartTenMinutesAhead) {
   const auto startsIn = [](long seconds) {
     const auto now = Tarnik::System::GetUtcDateTime();
     return AssertionText(
@@ -196,9 +202,9 @@ TEST(CreateSamlToken, ToleratesAStartTenMinutesAhead) {
   EXPECT_NO_THROW(CreateSamlToken(text.ToXml(), 720));
 }
 
-TEST(CreateSamlToken, RemembersItsTolerance) {
+TEST(CreateSamlTokenTest, RemembersItsTolerance) {
   const std::string xml = SignedXml();
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   const auto seconds = [](const std::shared_ptr<const SamlToken>& token) {
     return (token->ExpirationTimeWithTolerance().GetUtcTime() -
             token->ExpirationTime().GetUtcTime()) /
@@ -216,19 +222,19 @@ TEST(CreateSamlToken, RemembersItsTolerance) {
   EXPECT_EQ(seconds(CreateSamlTokenFromDom(document->RootElement(), resolver.get(), 7)), 7);
 }
 
-TEST(CreateSamlToken, KeepsTheTextAsGiven) {
+TEST(CreateSamlTokenTest, KeepsTheTextAsGiven) {
   const std::string xml =
       "<?xml version='1.0' encoding='UTF-8'?>\r\n<!-- token -->\r\n" + SignedXml() + "\r\n";
-  EXPECT_EQ(CreateSamlToken(xml, TestSupport::TrustedResolver().get())->Xml(), xml);
+  EXPECT_EQ(CreateSamlToken(xml, TrustedResolver().get())->Xml(), xml);
 }
 
-TEST(CreateSamlTokenFromDom, KeepsTheElementsCanonicalText) {
+TEST(CreateSamlTokenFromDomTest, KeepsTheElementsCanonicalText) {
   const std::string xml = SignedXml();
   const auto document =
       ParseXml("<wrapper xmlns:unused='urn:unused'>" +
                Replaced(xml, "<saml2:Issuer ", "<!--dropped--><saml2:Issuer ") + "</wrapper>");
-  const auto resolver = TestSupport::TrustedResolver();
-  ElementNode* assertion = TestSupport::FindElement(document->RootElement(), "Assertion");
+  const auto resolver = TrustedResolver();
+  ElementNode* assertion = FindElement(document->RootElement(), "Assertion");
   const auto token = CreateSamlTokenFromDom(assertion, resolver.get());
   EXPECT_EQ(token->Xml(), DevSts::Canonicalize(
                               "<wrapper xmlns:unused='urn:unused'>" + xml + "</wrapper>",
@@ -236,20 +242,19 @@ TEST(CreateSamlTokenFromDom, KeepsTheElementsCanonicalText) {
   EXPECT_EQ(CreateSamlToken(token->Xml(), resolver.get())->Xml(), token->Xml());
 }
 
-TEST(CreateSamlToken, PassesThePlatformsFaultOfATextThatIsNotXml) {
+TEST(CreateSamlTokenTest, PassesThePlatformsFaultOfATextThatIsNotXml) {
   for (const char* xml : {"", "not XML", "<a>", "<a/><b/>", "<saml2:Assertion/>"}) {
     EXPECT_THROW(CreateSamlToken(xml), XMLParseException) << xml;
   }
 }
 
-TEST(CreateSamlTokenFromDom, PassesThePlatformsFaultOfAnElementWithoutCanonicalForm) {
+TEST(CreateSamlTokenFromDomTest, PassesThePlatformsFaultOfAnElementWithoutCanonicalForm) {
   const auto document = ParseXml("<w xmlns:r=\"relative\">" + AssertionText().ToXml() + "</w>");
-  EXPECT_THROW(
-      CreateSamlTokenFromDom(TestSupport::FindElement(document->RootElement(), "Assertion")),
-      Tarnik::Xml::Security::XmlSecurityException);
+  EXPECT_THROW(CreateSamlTokenFromDom(FindElement(document->RootElement(), "Assertion")),
+               Tarnik::Xml::Security::XmlSecurityException);
 }
 
-TEST(CreateSamlTokenFromDom, RefusesNullAndOtherElements) {
+TEST(CreateSamlTokenFromDomTest, RefusesNullAndOtherElements) {
   EXPECT_EQ(ThrownMessage<ParseException>([] { CreateSamlTokenFromDom(nullptr); }),
             "Expected element 'Assertion' not found.");
   EXPECT_EQ(ThrownMessage<ParseException>(
@@ -257,29 +262,29 @@ TEST(CreateSamlTokenFromDom, RefusesNullAndOtherElements) {
             "Expected element 'Assertion' not found.");
 }
 
-TEST(CreateSamlTokenWithResolverSource, ShowsTheTokenThatItReturns) {
+TEST(CreateSamlTokenWithResolverSourceTest, ShowsTheTokenThatItReturns) {
   const SamlToken* shown = nullptr;
   std::string issuer;
   const auto token = CreateSamlToken(SignedXml(), [&](const SamlToken* unverified) {
     shown = unverified;
     issuer = unverified->Issuer();
-    return TestSupport::TrustedResolver();
+    return TrustedResolver();
   });
   EXPECT_EQ(token.get(), shown);
   EXPECT_EQ(issuer, "https://sts.example.com/STS");
 }
 
-TEST(CreateSamlTokenWithResolverSource, IsNotAskedForATokenThatDoesNotRead) {
+TEST(CreateSamlTokenWithResolverSourceTest, IsNotCalledForAnUnreadableToken) {
   bool asked = false;
   const auto source = [&](const SamlToken*) {
     asked = true;
-    return TestSupport::TrustedResolver();
+    return TrustedResolver();
   };
   EXPECT_THROW(CreateSamlToken(TextThatEnds(3600).ToXml(), source), ParseException);
   EXPECT_FALSE(asked);
 }
 
-TEST(CreateSamlTokenWithResolverSource, RefusesANullResolver) {
+TEST(CreateSamlTokenWithResolverSourceTest, RefusesANullResolver) {
   EXPECT_EQ(ThrownMessage<InvalidSignatureException>([] {
               CreateSamlToken(SignedXml(),
                               [](const SamlToken*) { return Ref<const KeyInfoResolver>(); });
@@ -287,13 +292,13 @@ TEST(CreateSamlTokenWithResolverSource, RefusesANullResolver) {
             "Signature verification error. There is no key info resolver for the token.");
 }
 
-TEST(CreateSamlTokenWithResolverSource, RefusesAnEmptySource) {
+TEST(CreateSamlTokenWithResolverSourceTest, RefusesAnEmptySource) {
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidArgumentException>(
                 [] { CreateSamlToken("not XML", KeyInfoResolverSource()); }),
             "The source of key info resolvers must not be empty.");
 }
 
-TEST(CreateSamlTokenWithResolverSource, PassesWhatItThrows) {
+TEST(CreateSamlTokenWithResolverSourceTest, PassesWhatItThrows) {
   EXPECT_EQ(ThrownMessage<Tarnik::InvalidStateException>([] {
               CreateSamlToken(SignedXml(), [](const SamlToken*) -> Ref<const KeyInfoResolver> {
                 throw Tarnik::InvalidStateException("no keys today");
@@ -302,14 +307,14 @@ TEST(CreateSamlTokenWithResolverSource, PassesWhatItThrows) {
             "no keys today");
 }
 
-TEST(CreateSamlToken, RefusesATokenCutAtEveryByte) {
+TEST(CreateSamlTokenTest, RefusesATokenCutAtEveryByte) {
   const std::string xml = SignedXml();
   for (std::size_t length = 0; length < xml.size(); ++length) {
     ASSERT_THROW(CreateSamlToken(xml.substr(0, length)), XMLParseException) << length;
   }
 }
 
-TEST(CreateSamlToken, RefusesDocumentTypes) {
+TEST(CreateSamlTokenTest, RefusesDocumentTypes) {
   const std::string xml = SignedXml();
   for (const std::string type :
        {"<!DOCTYPE a>", "<!DOCTYPE a [<!ENTITY e \"x\">]>", "<!DOCTYPE a SYSTEM \"file:///etc\">",
@@ -318,9 +323,9 @@ TEST(CreateSamlToken, RefusesDocumentTypes) {
   }
 }
 
-TEST(CreateSamlToken, ReadsUtf8Alone) {
+TEST(CreateSamlTokenTest, ReadsOnlyUtf8) {
   const std::string xml = SignedXml();
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   EXPECT_EQ(CreateSamlToken("\xEF\xBB\xBF" + xml, resolver.get())->Subject().name, "alice");
   for (const char* encoding : {"UTF-16", "UTF-7", "ISO-8859-1"}) {
     EXPECT_THROW(
@@ -333,7 +338,7 @@ TEST(CreateSamlToken, ReadsUtf8Alone) {
   }
 }
 
-TEST(CreateSamlToken, RefusesDepthWithoutRecursion) {
+TEST(CreateSamlTokenTest, RefusesDepthWithoutRecursion) {
   AssertionText text;
   std::string deep;
   for (int i = 0; i < 100'000; ++i) {
@@ -343,7 +348,7 @@ TEST(CreateSamlToken, RefusesDepthWithoutRecursion) {
   EXPECT_THROW(CreateSamlToken(text.ToXml()), XMLParseException);
 }
 
-TEST(CreateSamlToken, RefusesAttributesOfOneExpandedName) {
+TEST(CreateSamlTokenTest, RefusesAttributesOfOneExpandedName) {
   AssertionText text;
   text.attributes += " Version=\"2.0\"";
   EXPECT_THROW(CreateSamlToken(text.ToXml()), XMLParseException);
@@ -352,9 +357,9 @@ TEST(CreateSamlToken, RefusesAttributesOfOneExpandedName) {
   EXPECT_THROW(CreateSamlToken(prefixes.ToXml()), XMLParseException);
 }
 
-TEST(CreateSamlToken, MakesTokensOnManyThreads) {
+TEST(CreateSamlTokenTest, MakesTokensOnManyThreads) {
   const std::string xml = SignedXml();
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   const auto shared = CreateSamlToken(xml, resolver.get());
   std::vector<std::thread> threads;
   std::vector<int> accepted(4, 0);
@@ -373,4 +378,4 @@ TEST(CreateSamlToken, MakesTokensOnManyThreads) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

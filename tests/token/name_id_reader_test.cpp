@@ -1,17 +1,19 @@
 #include "token/name_id_reader.h"
 
-#include <ssoclient/exceptions.h>
+#include <string>
+#include <utility>
 
-#include "support/parsed_xml.h"
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/principal_id.h>
+
+#include "support/fragment.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::Fragment;
-using TestSupport::ThrownMessage;
-
-TEST(ReadNameId, KeepsFormatAndText) {
+TEST(ReadNameIdTest, KeepsFormatAndText) {
   Fragment fragment(R"(<saml2:Issuer Format="urn:f">the issuer</saml2:Issuer><next/>)");
   const NameId nameId = ReadNameId(fragment.Cursor(), "Issuer");
   EXPECT_EQ(nameId.format, "urn:f");
@@ -19,12 +21,12 @@ TEST(ReadNameId, KeepsFormatAndText) {
   EXPECT_TRUE(fragment.Cursor().IsAtElement("next"));
 }
 
-TEST(ReadNameId, LeavesAnAbsentFormatEmpty) {
+TEST(ReadNameIdTest, LeavesAnAbsentFormatEmpty) {
   Fragment fragment("<saml2:Issuer>i</saml2:Issuer>");
   EXPECT_EQ(ReadNameId(fragment.Cursor(), "Issuer").format, "");
 }
 
-TEST(ReadNameId, RefusesByTheReadingRules) {
+TEST(ReadNameIdTest, RefusesByTheReadingRules) {
   const std::pair<const char*, const char*> cases[] = {
       {"", "Expected element 'Issuer' not found."},
       {"<saml2:NameID>i</saml2:NameID>", "Expected element 'Issuer' not found."},
@@ -45,7 +47,7 @@ TEST(ReadNameId, RefusesByTheReadingRules) {
   }
 }
 
-TEST(ReadPrincipal, ReadsAUserPrincipalName) {
+TEST(ReadPrincipalTest, ReadsAUserPrincipalName) {
   Fragment fragment(
       R"(<saml2:NameID Format="http://schemas.xmlsoap.org/claims/UPN">a@b</saml2:NameID>)");
   const PrincipalId principal = ReadPrincipal(fragment.Cursor());
@@ -53,7 +55,7 @@ TEST(ReadPrincipal, ReadsAUserPrincipalName) {
   EXPECT_EQ(principal.domain, "b");
 }
 
-TEST(ReadPrincipal, RefusesOtherAndMissingFormat) {
+TEST(ReadPrincipalTest, RefusesOtherAndMissingFormat) {
   Fragment other(R"(<saml2:NameID Format="urn:f">a@b</saml2:NameID>)");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadPrincipal(other.Cursor()); }),
             "Invalid or unsupported NameId format 'urn:f");
@@ -66,8 +68,8 @@ TEST(ReadPrincipal, RefusesOtherAndMissingFormat) {
             "empty).");
 }
 
-// A reader that stops at a comment would see another user than the one that was signed.
-TEST(ReadPrincipal, RefusesSplitValues) {
+// A reader that stops at a comment would read another user than the signed one.
+TEST(ReadPrincipalTest, RefusesSplitValues) {
   for (const char* value : {"admin@x<!---->.evil", "admin@x<?p?>.evil", "admin@x<b/>.evil"}) {
     Fragment fragment(
         std::string(R"(<saml2:NameID Format="http://schemas.xmlsoap.org/claims/UPN">)") + value +
@@ -78,12 +80,61 @@ TEST(ReadPrincipal, RefusesSplitValues) {
   }
 }
 
-TEST(ReadPrincipal, ReadsCdataAsTheWholeValue) {
+TEST(ReadPrincipalTest, ReadsCdataAsTheWholeValue) {
   Fragment fragment(
       R"(<saml2:NameID Format="http://schemas.xmlsoap.org/claims/UPN">admin@x<![CDATA[.evil]]>)"
       "</saml2:NameID>");
   EXPECT_EQ(ReadPrincipal(fragment.Cursor()).domain, "x.evil");
 }
 
+constexpr char kUpn[] = "http://schemas.xmlsoap.org/claims/UPN";
+
+TEST(PrincipalFromNameIdTest, SplitsAtTheLastAtSign) {
+  const PrincipalId plain = PrincipalFromNameId(kUpn, "alice@example.com");
+  EXPECT_EQ(plain.name, "alice");
+  EXPECT_EQ(plain.domain, "example.com");
+  const PrincipalId twice = PrincipalFromNameId(kUpn, "alice@home@example.com");
+  EXPECT_EQ(twice.name, "alice@home");
+  EXPECT_EQ(twice.domain, "example.com");
+}
+
+TEST(PrincipalFromNameIdTest, RejectsMissingPart) {
+  for (const std::string value : {"alice", "@example.com", "alice@", "@", "", "a@b@"}) {
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { PrincipalFromNameId(kUpn, value); }),
+              "Failed to parse the UPN NameID: `" + value + "'; name or domain part is missing.");
+  }
+}
+
+TEST(PrincipalFromNameIdTest, RejectsOtherFormat) {
+  EXPECT_EQ(ThrownMessage<ParseException>([] { PrincipalFromNameId("urn:other", "a@b"); }),
+            "Invalid or unsupported NameId format 'urn:other");
+  EXPECT_EQ(ThrownMessage<ParseException>([] { PrincipalFromNameId("", "a@b"); }),
+            "Invalid or unsupported NameId format '");
+  EXPECT_EQ(ThrownMessage<ParseException>(
+                [] { PrincipalFromNameId("http://schemas.xmlsoap.org/claims/upn", "a@b"); }),
+            "Invalid or unsupported NameId format 'http://schemas.xmlsoap.org/claims/upn");
+}
+
+TEST(PrincipalFromNameIdTest, ChecksTheFormatBeforeTheValue) {
+  EXPECT_EQ(ThrownMessage<ParseException>([] { PrincipalFromNameId("urn:other", "alice"); }),
+            "Invalid or unsupported NameId format 'urn:other");
+}
+
+TEST(PrincipalFromGroupIdentityTest, SplitsAtTheFirstBackslash) {
+  const PrincipalId plain = PrincipalFromGroupIdentity("EXAMPLE\\staff");
+  EXPECT_EQ(plain.name, "staff");
+  EXPECT_EQ(plain.domain, "EXAMPLE");
+  const PrincipalId twice = PrincipalFromGroupIdentity("EXAMPLE\\staff\\night");
+  EXPECT_EQ(twice.name, "staff\\night");
+  EXPECT_EQ(twice.domain, "EXAMPLE");
+}
+
+TEST(PrincipalFromGroupIdentityTest, RejectsMissingPart) {
+  for (const std::string value : {"staff", "\\staff", "EXAMPLE\\", "\\", "", "EXAMPLE/staff"}) {
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { PrincipalFromGroupIdentity(value); }),
+              "Failed to parse Group Identity value: `" + value + "'; domain or group missing");
+  }
+}
+
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

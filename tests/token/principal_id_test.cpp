@@ -1,22 +1,24 @@
-#include <ssoclient/principal_id.h>
-
 #include <sys/mman.h>
 #include <unistd.h>
 
 #include <cstddef>
 #include <new>
+#include <string>
 
-namespace SsoClient {
+#include <gtest/gtest.h>
+#include <ssoclient/principal_id.h>
+
+namespace SsoClient::Testing {
 namespace {
 
-TEST(PrincipalId, EqualsWithoutRegardToLetterCase) {
+TEST(PrincipalIdTest, EqualsWithoutRegardToLetterCase) {
   EXPECT_TRUE((PrincipalId{"Alice", "Example.COM"} == PrincipalId{"alice", "example.com"}));
   EXPECT_TRUE((PrincipalId{"", ""} == PrincipalId{"", ""}));
   EXPECT_TRUE((PrincipalId{"ABCDEFGHIJKLMNOPQRSTUVWXYZ", "abcdefghijklmnopqrstuvwxyz"} ==
                PrincipalId{"abcdefghijklmnopqrstuvwxyz", "ABCDEFGHIJKLMNOPQRSTUVWXYZ"}));
 }
 
-TEST(PrincipalId, DiffersByNameOrDomain) {
+TEST(PrincipalIdTest, DiffersByNameOrDomain) {
   EXPECT_FALSE((PrincipalId{"alice", "a"} == PrincipalId{"alice", "b"}));
   EXPECT_FALSE((PrincipalId{"alice", "a"} == PrincipalId{"bob", "a"}));
   EXPECT_FALSE((PrincipalId{"alice", "a"} == PrincipalId{"alic", "a"}));
@@ -24,14 +26,14 @@ TEST(PrincipalId, DiffersByNameOrDomain) {
   EXPECT_FALSE((PrincipalId{"alice", "a"} == PrincipalId{"a", "alice"}));
 }
 
-TEST(PrincipalId, EqualsItself) {
+TEST(PrincipalIdTest, EqualsItself) {
   const PrincipalId principal{"alice", "a"};
   const PrincipalId& same = principal;
   EXPECT_TRUE(principal == same);
 }
 
-// The object stands on a page that no one may read while it is compared.
-TEST(PrincipalId, EqualsItselfWithoutALookAtItsStrings) {
+// The object is on a page that is not readable during the comparison.
+TEST(PrincipalIdTest, EqualsItselfWithoutReadingItsStrings) {
   const auto pageSize = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
   void* page = mmap(nullptr, pageSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
   ASSERT_NE(page, MAP_FAILED);
@@ -44,8 +46,8 @@ TEST(PrincipalId, EqualsItselfWithoutALookAtItsStrings) {
   munmap(page, pageSize);
 }
 
-// The domain stands on a page that no one may read while the object is compared.
-TEST(PrincipalId, LooksAtTheDomainsOnlyWhenTheNamesMatch) {
+// The domain is on a page that is not readable during the comparison.
+TEST(PrincipalIdTest, ComparesTheDomainsOnlyWhenTheNamesMatch) {
   const auto pageSize = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
   void* pages =
       mmap(nullptr, 2 * pageSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
@@ -59,17 +61,17 @@ TEST(PrincipalId, LooksAtTheDomainsOnlyWhenTheNamesMatch) {
   munmap(pages, 2 * pageSize);
 }
 
-TEST(PrincipalId, StopsAtTheFirstNul) {
+TEST(PrincipalIdTest, StopsAtTheFirstNul) {
   const PrincipalId a{std::string("alice\0x", 7), "d"};
   const PrincipalId b{std::string("ALICE\0y", 7), std::string("D\0z", 3)};
   EXPECT_TRUE(a == b);
 }
 
-TEST(PrincipalId, FoldsAsciiLettersOnly) {
+TEST(PrincipalIdTest, FoldsAsciiLettersOnly) {
   EXPECT_FALSE((PrincipalId{"\xC3\x84", "d"} == PrincipalId{"\xC3\xA4", "d"}));
   EXPECT_FALSE((PrincipalId{"a[", "d"} == PrincipalId{"a{", "d"}));
   EXPECT_FALSE((PrincipalId{"a@", "d"} == PrincipalId{"a`", "d"}));
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,24 +1,27 @@
 #include "token/saml_token_factory_default.h"
 
-#include <tarnik/core/object_impl.h>
+#include <memory>
+#include <string>
+
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/saml_token.h>
+#include <ssoclient/saml_token_factory.h>
+#include <tarnik/xml/element_node.h>
 
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/parse_xml.h"
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::Xml::ElementNode;
 using Token = std::shared_ptr<const SamlToken>;
-using TestSupport::AssertionText;
-using TestSupport::ParseXml;
-using TestSupport::ThrownMessage;
-using TestSupport::VtableSlot;
 
 std::string SignedXml() {
-  return AssertionText().ToSignedXml(TestSupport::TrustedCredential());
+  return AssertionText().ToSignedXml(TrustedCredential());
 }
 
 long ToleranceOf(const Token& token) {
@@ -27,8 +30,8 @@ long ToleranceOf(const Token& token) {
          1'000'000;
 }
 
-TEST(SamlTokenFactoryDefault, CreatesVerifiedTokens) {
-  const auto factory = CreateSamlTokenFactory(TestSupport::TrustedResolver().get());
+TEST(SamlTokenFactoryDefaultTest, CreatesVerifiedTokens) {
+  const auto factory = CreateSamlTokenFactory(TrustedResolver().get());
   const std::string xml = SignedXml();
   const auto document = ParseXml(xml);
   EXPECT_EQ(ToleranceOf(factory->CreateToken(xml)), 600);
@@ -37,9 +40,9 @@ TEST(SamlTokenFactoryDefault, CreatesVerifiedTokens) {
   EXPECT_EQ(ToleranceOf(factory->CreateToken(document->RootElement(), 5)), 5);
 }
 
-TEST(SamlTokenFactoryDefault, RefusesABadSignatureThroughEveryOperation) {
-  const auto factory = CreateSamlTokenFactory(TestSupport::TrustedResolver().get());
-  const std::string xml = TestSupport::Replaced(SignedXml(), "alice@", "admin@");
+TEST(SamlTokenFactoryDefaultTest, RefusesABadSignatureThroughEveryOperation) {
+  const auto factory = CreateSamlTokenFactory(TrustedResolver().get());
+  const std::string xml = Replaced(SignedXml(), "alice@", "admin@");
   const auto document = ParseXml(xml);
   const std::string expected = "Failed to verify signature: token might have been tampered with.";
   EXPECT_EQ(ThrownMessage<InvalidSignatureException>([&] { factory->CreateToken(xml); }), expected);
@@ -53,20 +56,20 @@ TEST(SamlTokenFactoryDefault, RefusesABadSignatureThroughEveryOperation) {
             expected);
 }
 
-TEST(SamlTokenFactoryDefault, VerifiesNothingWithoutAResolver) {
-  const std::string xml = TestSupport::Replaced(SignedXml(), "alice@", "admin@");
+TEST(SamlTokenFactoryDefaultTest, VerifiesNothingWithoutAResolver) {
+  const std::string xml = Replaced(SignedXml(), "alice@", "admin@");
   EXPECT_EQ(CreateSamlTokenFactory(nullptr)->CreateToken(xml)->Subject().name, "admin");
 }
 
-TEST(SamlTokenFactoryDefault, KeepsItsResolverAlive) {
-  auto resolver = TestSupport::TrustedResolver();
+TEST(SamlTokenFactoryDefaultTest, KeepsItsResolverAlive) {
+  auto resolver = TrustedResolver();
   const auto factory = CreateSamlTokenFactory(resolver.get());
   EXPECT_EQ(resolver->RefCount(), 2);
   resolver.reset();
   EXPECT_EQ(factory->CreateToken(SignedXml())->Subject().name, "alice");
 }
 
-// Notes the tolerances that it is asked for.
+// Records the tolerances that it is called with.
 class RecordingFactory final : public SamlTokenFactoryDefault {
  public:
   RecordingFactory() : SamlTokenFactoryDefault(nullptr) {}
@@ -85,7 +88,7 @@ class RecordingFactory final : public SamlTokenFactoryDefault {
   mutable long elementTolerance = 0;
 };
 
-TEST(SamlTokenFactoryDefault, HonoursASubclassWhereNoToleranceIsGiven) {
+TEST(SamlTokenFactoryDefaultTest, HonoursASubclassWhereNoToleranceIsGiven) {
   const RecordingFactory factory;
   const SamlTokenFactory& face = factory;
   EXPECT_EQ(face.CreateToken("text"), nullptr);
@@ -94,8 +97,8 @@ TEST(SamlTokenFactoryDefault, HonoursASubclassWhereNoToleranceIsGiven) {
   EXPECT_EQ(factory.elementTolerance, 600);
 }
 
-TEST(SamlTokenFactory, KeepsItsSlotOrder) {
-  const auto factory = CreateSamlTokenFactory(TestSupport::TrustedResolver().get());
+TEST(SamlTokenFactoryTest, KeepsItsSlotOrder) {
+  const auto factory = CreateSamlTokenFactory(TrustedResolver().get());
   const SamlTokenFactory* face = factory.get();
   const std::string xml = SignedXml();
   const auto document = ParseXml(xml);
@@ -115,4 +118,4 @@ TEST(SamlTokenFactory, KeepsItsSlotOrder) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,26 +1,33 @@
 #include "token/saml_token_impl.h"
 
-#include <cstdlib>
+#include <cstddef>
 #include <cstring>
-#include <ctime>
 #include <limits>
+#include <memory>
+#include <set>
+#include <string>
+#include <vector>
 
+#include <gtest/gtest.h>
+#include <ssoclient/principal_id.h>
+#include <ssoclient/saml_token.h>
+#include <tarnik/core/ref.h>
 #include <tarnik/crypto/certificate.h>
+#include <tarnik/system/date_time.h>
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/signature.h>
 
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/local_zone.h"
+#include "support/parse_xml.h"
 #include "support/vtable_slot.h"
 #include "token/assertion_reader.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::Ref;
 using Tarnik::System::DateTime;
-using TestSupport::AssertionText;
-using TestSupport::ParseXml;
-using TestSupport::Replaced;
-using TestSupport::VtableSlot;
 
 const DateTime kNow = DateTime::Parse("2024-03-05T07:01:00Z");
 
@@ -31,11 +38,10 @@ std::shared_ptr<const SamlTokenImpl> MakeToken(const AssertionText& text, long t
 }
 
 AssertionText FullText() {
-  return AssertionText(kNow).Delegate().ConfirmByKey(
-      TestSupport::TrustedCredential().certificatePem);
+  return AssertionText(kNow).Delegate().ConfirmByKey(TrustedCredential().certificatePem);
 }
 
-TEST(SamlTokenImpl, TellsEveryValue) {
+TEST(SamlTokenImplTest, ReturnsEveryValue) {
   const AssertionText text = FullText();
   const auto token = MakeToken(text);
   EXPECT_EQ(token->Id(), "_a1");
@@ -52,15 +58,14 @@ TEST(SamlTokenImpl, TellsEveryValue) {
   const auto certificate = token->HolderOfKeyCertificate();
   ASSERT_NE(certificate, nullptr);
   const auto expected =
-      Tarnik::Crypto::CreateCertificatesFromPem(TestSupport::TrustedCredential().certificatePem)
-          .front();
+      Tarnik::Crypto::CreateCertificatesFromPem(TrustedCredential().certificatePem).front();
   ASSERT_EQ(certificate->DerLength(), expected->DerLength());
   EXPECT_EQ(std::memcmp(certificate->DerBytes(), expected->DerBytes(), expected->DerLength()), 0);
   ASSERT_NE(token->GetSignature(), nullptr);
   EXPECT_EQ(token->GetSignature()->References().front().uri, "#_a1");
 }
 
-TEST(SamlTokenImpl, ReplacesWhatItsArgumentsHeld) {
+TEST(SamlTokenImplTest, ReplacesWhatItsArgumentsHeld) {
   const auto token = MakeToken(FullText());
   SubjectNames names{"old", "old"};
   token->GetSubjectNames(names);
@@ -94,7 +99,7 @@ TEST(SamlTokenImpl, ReplacesWhatItsArgumentsHeld) {
   EXPECT_EQ(advice[0].attributes[0].values, (std::vector<std::string>{"one", "two"}));
 }
 
-TEST(SamlTokenImpl, IsEmptyWhereTheAssertionIsSilent) {
+TEST(SamlTokenImplTest, IsEmptyWithoutTheOptionalParts) {
   AssertionText text(kNow);
   text.advice.clear();
   text.authnStatement.clear();
@@ -123,7 +128,7 @@ TEST(SamlTokenImpl, IsEmptyWhereTheAssertionIsSilent) {
   EXPECT_TRUE(advice.empty());
 }
 
-TEST(SamlTokenImpl, IsRenewableAndDelegableByCountsOtherThanZero) {
+TEST(SamlTokenImplTest, IsRenewableAndDelegableByCountsOtherThanZero) {
   for (const char* count : {"0", "-0", "+0", "000"}) {
     AssertionText text(kNow);
     text.conditions =
@@ -138,7 +143,7 @@ TEST(SamlTokenImpl, IsRenewableAndDelegableByCountsOtherThanZero) {
   }
 }
 
-TEST(SamlTokenImpl, IsDelegableWithoutADelegationChain) {
+TEST(SamlTokenImplTest, IsDelegableWithoutADelegationChain) {
   AssertionText text(kNow);
   const auto chainLength = [](const SamlToken& token) {
     std::vector<Delegate> chain(1);
@@ -154,13 +159,13 @@ TEST(SamlTokenImpl, IsDelegableWithoutADelegationChain) {
   EXPECT_EQ(chainLength(*MakeToken(text)), 2U);
 }
 
-TEST(SamlTokenImpl, IsASolutionWhenItsAttributeSaysSo) {
+TEST(SamlTokenImplTest, IsASolutionWhenItsAttributeSaysSo) {
   AssertionText text(kNow);
   text.attributeStatement = Replaced(text.attributeStatement, ">false<", ">True<");
   EXPECT_TRUE(MakeToken(text)->IsSolution());
 }
 
-TEST(SamlTokenImpl, AddsItsToleranceToTheExpirationTime) {
+TEST(SamlTokenImplTest, AddsItsToleranceToTheExpirationTime) {
   const AssertionText text(kNow);
   EXPECT_EQ(MakeToken(text, 0)->ExpirationTimeWithTolerance(), MakeToken(text)->ExpirationTime());
   EXPECT_EQ(MakeToken(text)->ExpirationTimeWithTolerance().ToString(), "2024-03-05T08:11:00.000Z");
@@ -168,20 +173,15 @@ TEST(SamlTokenImpl, AddsItsToleranceToTheExpirationTime) {
             "2024-03-05T08:00:00.000Z");
 }
 
-TEST(SamlTokenImpl, TellsItsTimesInUtcInEveryZone) {
-  const char* before = std::getenv("TZ");
-  const std::string saved = before == nullptr ? "" : before;
-  setenv("TZ", "XYZ-5:30", 1);
-  tzset();
+TEST(SamlTokenImplTest, ReturnsItsTimesInUtcInEveryZone) {
+  const LocalZone zone;
   const auto token = MakeToken(AssertionText(kNow));
   EXPECT_EQ(token->StartTime().ToString(), "2024-03-05T07:00:00.000Z");
   EXPECT_EQ(token->ExpirationTime().ToString(), "2024-03-05T08:01:00.000Z");
   EXPECT_EQ(token->ExpirationTimeWithTolerance().ToString(), "2024-03-05T08:11:00.000Z");
-  before == nullptr ? unsetenv("TZ") : setenv("TZ", saved.c_str(), 1);
-  tzset();
 }
 
-TEST(SamlTokenImpl, StopsAtTheEndsOfTimeWithExtremeTolerances) {
+TEST(SamlTokenImplTest, StopsAtTheEndsOfTimeWithExtremeTolerances) {
   const AssertionText text(kNow);
   EXPECT_EQ(
       MakeToken(text, std::numeric_limits<long>::max())->ExpirationTimeWithTolerance().ToString(),
@@ -191,7 +191,7 @@ TEST(SamlTokenImpl, StopsAtTheEndsOfTimeWithExtremeTolerances) {
       "0001-01-01T00:00:00.000Z");
 }
 
-TEST(SamlTokenImpl, KeepsItsSignaturesTreeAlive) {
+TEST(SamlTokenImplTest, KeepsItsSignaturesTreeAlive) {
   const auto token = MakeToken(AssertionText(kNow));
   const Tarnik::Xml::ElementNode* signature = token->GetSignature()->Element();
   ASSERT_NE(signature, nullptr);
@@ -205,7 +205,7 @@ Result CallSlot(const SamlToken* token, std::size_t index, Arguments... argument
   return VtableSlot<Result(const SamlToken*, Arguments...)>(token, index)(token, arguments...);
 }
 
-TEST(SamlToken, KeepsTheSlotOrderOfItsValues) {
+TEST(SamlTokenTest, KeepsTheSlotOrderOfItsValues) {
   AssertionText text = FullText();
   text.conditions = Replaced(text.conditions, "Count=\"10\"", "Count=\"0\"");
   const auto implementation = MakeToken(text);
@@ -224,7 +224,7 @@ TEST(SamlToken, KeepsTheSlotOrderOfItsValues) {
   EXPECT_EQ(signature, token->GetSignature());
 }
 
-TEST(SamlToken, KeepsTheSlotOrderOfItsFlags) {
+TEST(SamlTokenTest, KeepsTheSlotOrderOfItsFlags) {
   for (int flags = 0; flags < 8; ++flags) {
     AssertionText text(kNow);
     text.conditions =
@@ -241,7 +241,7 @@ TEST(SamlToken, KeepsTheSlotOrderOfItsFlags) {
   }
 }
 
-TEST(SamlToken, KeepsTheSlotOrderOfItsCollections) {
+TEST(SamlTokenTest, KeepsTheSlotOrderOfItsCollections) {
   const auto implementation = MakeToken(FullText());
   const SamlToken* token = implementation.get();
   SubjectNames names;
@@ -265,4 +265,4 @@ TEST(SamlToken, KeepsTheSlotOrderOfItsCollections) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

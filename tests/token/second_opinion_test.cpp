@@ -1,10 +1,13 @@
-#include <ssoclient/saml_token.h>
-
-#include <devsts/xml_security.h>
-
 #include <chrono>
+#include <cstddef>
 #include <optional>
 #include <random>
+#include <string>
+
+#include <devsts/xml_security.h>
+#include <gtest/gtest.h>
+#include <ssoclient/saml_token.h>
+#include <tarnik/core/exception.h>
 
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
@@ -12,33 +15,31 @@
 #include "support/token_editor.h"
 #include "support/token_values.h"
 
-// Whatever a resolver lets through tells what was signed, and an independent reader of XML
-// signatures lets it through, too: over signed assertions of every kind, edited at random.
-namespace SsoClient {
+// Every token that a resolver accepts has the signed values, and an independent verifier of XML
+// signatures accepts it too. Tested with signed assertions of every kind, edited at random.
+namespace SsoClient::Testing {
 namespace {
-
-using TestSupport::SecondOpinionOf;
 
 constexpr std::chrono::seconds kTime{4};
 
-/// What the token of this text tells, or nothing when it is refused.
+/// The values of the token with this text, or nothing if it is refused.
 std::optional<std::string> AcceptedValues(const std::string& xml) {
-  static const auto resolver = TestSupport::TrustedResolver();
+  static const auto resolver = TrustedResolver();
   try {
-    return TestSupport::AllValues(*CreateSamlToken(xml, resolver.get()));
+    return AllValues(*CreateSamlToken(xml, resolver.get()));
   } catch (const Tarnik::Exception&) {
     return std::nullopt;
   }
 }
 
-TEST(SecondOpinion, IsGoodOfWhateverIsAccepted) {
+TEST(SecondOpinionTest, AcceptsWhateverTheLibraryAccepts) {
   const unsigned seed = std::random_device()();
   SCOPED_TRACE("seed " + std::to_string(seed));
   std::mt19937 random(seed);
   const auto below = [&random](std::size_t bound) {
     return std::uniform_int_distribution<std::size_t>(0, bound - 1)(random);
   };
-  TestSupport::TokenEditor editor(below);
+  TokenEditor editor(below);
   const auto end = std::chrono::steady_clock::now() + kTime;
   std::size_t accepted = 0;
   std::size_t refused = 0;
@@ -63,15 +64,14 @@ TEST(SecondOpinion, IsGoodOfWhateverIsAccepted) {
     ASSERT_EQ(*edited, *values) << xml;
     ASSERT_EQ(SecondOpinionOf(xml), "") << xml;
   }
-  // The edits are neither all harmless nor all fatal.
+  // Some edits are harmless and some are fatal.
   EXPECT_GT(accepted, 0U);
   EXPECT_GT(refused, 0U);
 }
 
-// The twin: the second opinion does not say yes to everything.
-TEST(SecondOpinion, IsBadOfATamperedAssertion) {
-  const std::string xml =
-      TestSupport::Replaced(TestSupport::OriginalAssertion(), "alice@", "admin@");
+// Control: the independent verifier does not accept everything.
+TEST(SecondOpinionTest, RejectsATamperedAssertion) {
+  const std::string xml = Replaced(OriginalAssertion(), "alice@", "admin@");
   EXPECT_EQ(AcceptedValues(xml), std::nullopt);
   EXPECT_NE(SecondOpinionOf(xml), "");
 }
@@ -79,25 +79,24 @@ TEST(SecondOpinion, IsBadOfATamperedAssertion) {
 const std::string kUnusedPrefix = "<saml2:Subject xmlns:unused=\"urn:[\">";
 
 std::string WithMalformedNamespace() {
-  return TestSupport::Replaced(TestSupport::OriginalAssertion(), "<saml2:Subject>", kUnusedPrefix);
+  return Replaced(OriginalAssertion(), "<saml2:Subject>", kUnusedPrefix);
 }
 
-TEST(SecondOpinion, IsAskedAgainWithoutAMalformedNamespaceThatNothingUses) {
+TEST(SecondOpinionTest, IgnoresAnUnusedMalformedNamespace) {
   const std::string xml = WithMalformedNamespace();
   EXPECT_TRUE(AcceptedValues(xml));
-  EXPECT_FALSE(DevSts::VerifyXml(xml, TestSupport::TrustedCredential().certificatePem));
+  EXPECT_FALSE(DevSts::VerifyXml(xml, TrustedCredential().certificatePem));
   EXPECT_EQ(SecondOpinionOf(xml), "");
 }
 
-// The twin: such a namespace excuses nothing else.
-TEST(SecondOpinion, IsBadOfATamperedAssertionWithAMalformedNamespace) {
-  EXPECT_NE(SecondOpinionOf(TestSupport::Replaced(WithMalformedNamespace(), "alice@", "admin@")),
-            "");
-  EXPECT_NE(SecondOpinionOf(TestSupport::Replaced(
-                TestSupport::OriginalAssertion(),
-                "xmlns:saml2=\"urn:oasis:names:tc:SAML:2.0:assertion\"", "xmlns:saml2=\"urn:[\"")),
+// Control: such a namespace does not hide another error.
+TEST(SecondOpinionTest, RejectsATamperedAssertionWithAMalformedNamespace) {
+  EXPECT_NE(SecondOpinionOf(Replaced(WithMalformedNamespace(), "alice@", "admin@")), "");
+  EXPECT_NE(SecondOpinionOf(Replaced(OriginalAssertion(),
+                                     "xmlns:saml2=\"urn:oasis:names:tc:SAML:2.0:assertion\"",
+                                     "xmlns:saml2=\"urn:[\"")),
             "");
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,30 +1,25 @@
+#include <string>
+#include <tuple>
+#include <vector>
+
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/xml/element_node.h>
 
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
-#include "support/parsed_xml.h"
+#include "support/parse_xml.h"
 #include "support/thrown_message.h"
 #include "token/strict_rules.h"
 
-// Forged assertions beside a signed original, in every arrangement: whatever a resolver lets
-// through must be the signed original itself.
-namespace SsoClient {
+// Forged assertions together with a signed original, in every arrangement: only the signed original
+// itself may be accepted.
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::Xml::ElementNode;
-using TestSupport::AllForgedIds;
-using TestSupport::AllForgedSignatures;
-using TestSupport::AllPlaces;
-using TestSupport::Arranged;
-using TestSupport::ForgedAssertion;
-using TestSupport::ForgedId;
-using TestSupport::ForgedSignature;
-using TestSupport::InsertedBehind;
-using TestSupport::OriginalAssertion;
-using TestSupport::ParseXml;
-using TestSupport::Place;
-using TestSupport::Replaced;
-using TestSupport::SignatureOf;
 
 void CollectAssertions(ElementNode* element, std::vector<ElementNode*>& found) {
   if (element->LocalName() == "Assertion") {
@@ -43,7 +38,7 @@ bool HoldsForgedSubject(const ElementNode* assertion) {
   return ReadTextContent(*subject->FirstChildElement("NameID")) == "admin@example.com";
 }
 
-// "" if refused, else the name of the accepted subject.
+// The name of the accepted subject; "" if refused.
 template <class Create>
 std::string AcceptedSubject(Create&& create) {
   try {
@@ -55,9 +50,9 @@ std::string AcceptedSubject(Create&& create) {
 
 using Attack = std::tuple<Place, ForgedId, ForgedSignature>;
 
-class SignatureWrapping : public testing::TestWithParam<Attack> {};
+class SignatureWrappingTest : public testing::TestWithParam<Attack> {};
 
-TEST_P(SignatureWrapping, NeverYieldsTheForgedAssertion) {
+TEST_P(SignatureWrappingTest, NeverYieldsTheForgedAssertion) {
   const auto& [place, id, signature] = GetParam();
   const std::string original = OriginalAssertion();
   const std::string xml = Arranged(place, ForgedAssertion(id, signature, original), original);
@@ -65,7 +60,7 @@ TEST_P(SignatureWrapping, NeverYieldsTheForgedAssertion) {
     EXPECT_TRUE(signature == ForgedSignature::kUnsigned);
     return;
   }
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   EXPECT_EQ(AcceptedSubject([&] { return CreateSamlToken(xml, resolver.get()); }), "");
   const auto document = ParseXml(xml);
   std::vector<ElementNode*> assertions;
@@ -81,14 +76,14 @@ TEST_P(SignatureWrapping, NeverYieldsTheForgedAssertion) {
   }
 }
 
-INSTANTIATE_TEST_SUITE_P(Arrangements, SignatureWrapping,
+INSTANTIATE_TEST_SUITE_P(Arrangements, SignatureWrappingTest,
                          testing::Combine(testing::ValuesIn(AllPlaces()),
                                           testing::ValuesIn(AllForgedIds()),
                                           testing::ValuesIn(AllForgedSignatures())));
 
-// The same forgeries read without a resolver where only the signature gives them away, so it is the
-// signature that the tests above see refused.
-TEST(SignatureWrappingTwin, ReadsForgeriesWhenNothingIsVerified) {
+// Without a resolver the forgeries that only their signature reveals are accepted. So the tests
+// above fail because of the signature.
+TEST(SignatureWrappingControlTest, ReadsForgeriesWhenNothingIsVerified) {
   const std::string original = OriginalAssertion();
   for (const ForgedSignature signature :
        {ForgedSignature::kOriginal, ForgedSignature::kStranger, ForgedSignature::kMadeUp}) {
@@ -105,10 +100,10 @@ TEST(SignatureWrappingTwin, ReadsForgeriesWhenNothingIsVerified) {
   }
 }
 
-// An original whose id is its own verifies in whatever document it stands.
-TEST(SignatureWrappingTwin, AcceptsTheOriginalBesideAnotherAssertion) {
+// An original with a unique id verifies in every document.
+TEST(SignatureWrappingControlTest, AcceptsTheOriginalNextToAnotherAssertion) {
   const std::string original = OriginalAssertion();
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   for (const Place place : {Place::kBefore, Place::kAfter, Place::kOriginalInSoapHeader}) {
     const auto document = ParseXml(Arranged(
         place, ForgedAssertion(ForgedId::kNew, ForgedSignature::kStranger, original), original));
@@ -121,28 +116,28 @@ TEST(SignatureWrappingTwin, AcceptsTheOriginalBesideAnotherAssertion) {
   }
 }
 
-// Ids under other names that hold the same value.
-TEST(SignatureWrapping, RefusesASecondElementOfTheSameId) {
+// Id attributes of other names with the same value.
+TEST(SignatureWrappingTest, RefusesASecondElementOfTheSameId) {
   const std::string original = OriginalAssertion();
-  const auto resolver = TestSupport::TrustedResolver();
-  for (const char* twin : {"<x ID=\"_a1\"/>", "<x Id=\"_a1\"/>", "<x xml:id=\"_a1\"/>"}) {
-    const auto document = ParseXml("<r>" + original + twin + "</r>");
-    ElementNode* assertion = TestSupport::FindElement(document->RootElement(), "Assertion");
+  const auto resolver = TrustedResolver();
+  for (const char* sameId : {"<x ID=\"_a1\"/>", "<x Id=\"_a1\"/>", "<x xml:id=\"_a1\"/>"}) {
+    const auto document = ParseXml("<r>" + original + sameId + "</r>");
+    ElementNode* assertion = FindElement(document->RootElement(), "Assertion");
     EXPECT_THROW(CreateSamlTokenFromDom(assertion, resolver.get()), InvalidSignatureException)
-        << twin;
+        << sameId;
   }
 }
 
-// What a signature leaves out of its own digest is no place for another assertion.
-TEST(SignatureWrapping, RefusesAnAssertionInTheKeyInfoOfTheOriginal) {
+// An assertion is not accepted in a place that the signature's digest does not cover.
+TEST(SignatureWrappingTest, RefusesAnAssertionInTheKeyInfoOfTheOriginal) {
   const std::string original = OriginalAssertion();
-  const auto resolver = TestSupport::TrustedResolver();
+  const auto resolver = TrustedResolver();
   const std::string forged = ForgedAssertion(ForgedId::kNew, ForgedSignature::kStranger, original);
   for (const Place place : {Place::kChildInKeyInfo, Place::kChildInX509Data}) {
-    EXPECT_EQ(TestSupport::ThrownMessage<ParseException>(
+    EXPECT_EQ(ThrownMessage<ParseException>(
                   [&] { CreateSamlToken(Arranged(place, forged, original), resolver.get()); }),
               "Token's signature must not hold SAML elements");
-    // The twin: an element of another namespace in the same place leaves the verdict alone.
+    // Control: an element of another namespace in the same place does not change the verdict.
     EXPECT_EQ(AcceptedSubject([&] {
                 return CreateSamlToken(Arranged(place, "<x xmlns=\"urn:x\"/>", original),
                                        resolver.get());
@@ -151,15 +146,15 @@ TEST(SignatureWrapping, RefusesAnAssertionInTheKeyInfoOfTheOriginal) {
   }
 }
 
-TEST(SignatureWrapping, RefusesSignaturesOutOfTheirPlace) {
-  const auto resolver = TestSupport::TrustedResolver();
+TEST(SignatureWrappingTest, RefusesSignaturesOutOfTheirPlace) {
+  const auto resolver = TrustedResolver();
   const std::string original = OriginalAssertion();
   const std::string signature = SignatureOf(original);
   const std::string bare = Replaced(original, signature, "");
   const std::string variants[] = {
-      bare, InsertedBehind(bare, "</saml2:Subject>", signature),
+      bare, InsertedAfter(bare, "</saml2:Subject>", signature),
       Replaced(bare, "</saml2:Assertion>", signature + "</saml2:Assertion>"),
-      InsertedBehind(original, signature, signature),
+      InsertedAfter(original, signature, signature),
       Replaced(bare, "<saml2:Subject>", "<saml2:Subject>" + signature)};
   EXPECT_EQ(CreateSamlToken(original, resolver.get())->Subject().name, "alice");
   for (const std::string& variant : variants) {
@@ -169,4 +164,4 @@ TEST(SignatureWrapping, RefusesSignaturesOutOfTheirPlace) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

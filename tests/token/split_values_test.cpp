@@ -1,20 +1,25 @@
+#include <cstddef>
+#include <ostream>
+#include <string>
+
+#include <devsts/certificates.h>
+#include <devsts/xml_security.h>
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 
 #include "support/assertion_text.h"
 #include "support/thrown_message.h"
 #include "support/token_values.h"
 
-// Values that something stands in the middle of: a reader that takes the first piece of text for
-// the whole would read another name than was signed.
-namespace SsoClient {
+// Values that are split by a node. A reader that takes the first piece of text for the whole value
+// would read another name than the signed one.
+namespace SsoClient::Testing {
 namespace {
-
-using TestSupport::AssertionText;
-using TestSupport::Replaced;
 
 struct SplitValue {
   const char* name;
-  std::string value;  ///< as it stands once in the text
+  std::string value;  ///< occurs once in the text
   std::size_t at;     ///< where it is split
 };
 
@@ -30,7 +35,7 @@ std::string UnsignedXml() {
 }
 
 std::string SignedXml(const std::string& xml) {
-  const DevSts::Credential& signer = TestSupport::TrustedCredential();
+  const DevSts::Credential& signer = TrustedCredential();
   DevSts::SignOptions options;
   options.signature = DevSts::SignatureAlgorithm::EcdsaSha256;
   return DevSts::SignXml(xml, signer.privateKeyPem, signer.certificatePem, options);
@@ -41,12 +46,12 @@ std::string SplitBy(const std::string& xml, const SplitValue& split, const std::
   return Replaced(xml, split.value, value.insert(split.at, node));
 }
 
-class SplitValues : public testing::TestWithParam<SplitValue> {
+class SplitValuesTest : public testing::TestWithParam<SplitValue> {
  protected:
   static void ExpectRefused(const std::string& xml) {
-    const auto resolver = TestSupport::TrustedResolver();
+    const auto resolver = TrustedResolver();
     const std::string message =
-        TestSupport::ThrownMessage<ParseException>([&] { CreateSamlToken(xml, resolver.get()); });
+        ThrownMessage<ParseException>([&] { CreateSamlToken(xml, resolver.get()); });
     EXPECT_TRUE(
         message.ends_with("' must only have textual content (but has extra children or is empty)."))
         << message;
@@ -54,33 +59,33 @@ class SplitValues : public testing::TestWithParam<SplitValue> {
   }
 };
 
-// Whoever writes the signature does not matter here: not even the trusted signer may do so.
-TEST_P(SplitValues, AreRefusedAlsoWhenSigned) {
+// The signer does not matter: not even the trusted signer may do this.
+TEST_P(SplitValuesTest, AreRefusedAlsoWhenSigned) {
   for (const char* node : {"<!---->", "<!--x-->", "<?p?>", "<?p x?>", "<x/>", "<x>y</x>"}) {
     const std::string xml = SignedXml(SplitBy(UnsignedXml(), GetParam(), node));
-    ASSERT_TRUE(DevSts::VerifyXml(xml, TestSupport::TrustedCredential().certificatePem));
+    ASSERT_TRUE(DevSts::VerifyXml(xml, TrustedCredential().certificatePem));
     ExpectRefused(xml);
   }
 }
 
-// A comment leaves the signature good, for its canonical form holds none.
-TEST_P(SplitValues, AreRefusedWhenSplitByACommentAfterwards) {
+// A comment does not change the signature, since the canonical form has no comments.
+TEST_P(SplitValuesTest, AreRefusedWhenSplitByACommentAfterwards) {
   const std::string xml = SplitBy(SignedXml(UnsignedXml()), GetParam(), "<!---->");
-  ASSERT_TRUE(DevSts::VerifyXml(xml, TestSupport::TrustedCredential().certificatePem));
+  ASSERT_TRUE(DevSts::VerifyXml(xml, TrustedCredential().certificatePem));
   ExpectRefused(xml);
 }
 
-// The twin: split by what is text itself, the value is read whole.
-TEST_P(SplitValues, AreReadWholeWhenSplitByText) {
-  const auto resolver = TestSupport::TrustedResolver();
+// Control: a value that is split by text is read whole.
+TEST_P(SplitValuesTest, AreReadWholeWhenSplitByText) {
+  const auto resolver = TrustedResolver();
   const std::string original = SignedXml(UnsignedXml());
-  const std::string values = TestSupport::AllValues(*CreateSamlToken(original, resolver.get()));
+  const std::string values = AllValues(*CreateSamlToken(original, resolver.get()));
   const std::string xml = SplitBy(original, GetParam(), "<![CDATA[]]>");
-  EXPECT_EQ(TestSupport::AllValues(*CreateSamlToken(xml, resolver.get())), values);
+  EXPECT_EQ(AllValues(*CreateSamlToken(xml, resolver.get())), values);
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Values, SplitValues,
+    Values, SplitValuesTest,
     testing::Values(SplitValue{"Subject", "alice@example.com", 9},
                     SplitValue{"Delegate", "first@example.com", 9},
                     SplitValue{"Issuer", "https://sts.example.com/STS", 19},
@@ -92,4 +97,4 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,22 +1,22 @@
 #include "token/subject_reader.h"
 
+#include <cstddef>
+#include <string>
+#include <utility>
+
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/system/date_time.h>
 
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/fragment.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
-
-using TestSupport::AssertionText;
-using TestSupport::CertificateBody;
-using TestSupport::Fragment;
-using TestSupport::InsertedBehind;
-using TestSupport::Replaced;
-using TestSupport::ThrownMessage;
-using TestSupport::TrustedCredential;
 
 const Tarnik::System::DateTime kNow = Tarnik::System::DateTime::Parse("2024-03-05T07:00:00Z");
 
@@ -39,7 +39,7 @@ std::string Refusal(const std::string& text) {
   return ThrownMessage<ParseException>([&] { Read(text); });
 }
 
-TEST(ReadSubject, ReadsABearerSubject) {
+TEST(ReadSubjectTest, ReadsABearerSubject) {
   const ParsedSubject subject = Read(BearerText());
   EXPECT_EQ(subject.principal.name, "alice");
   EXPECT_EQ(subject.principal.domain, "example.com");
@@ -54,7 +54,7 @@ std::string DerOf(const Tarnik::Crypto::Certificate& certificate) {
                      certificate.DerLength());
 }
 
-TEST(ReadSubject, ReadsAHolderOfKeySubject) {
+TEST(ReadSubjectTest, ReadsAHolderOfKeySubject) {
   const ParsedSubject subject = Read(HolderOfKeyText());
   EXPECT_EQ(subject.confirmationMethod, HOLDER_OF_KEY);
   EXPECT_EQ(subject.notOnOrAfter.ToString(), "2024-03-05T08:00:00.000Z");
@@ -65,7 +65,7 @@ TEST(ReadSubject, ReadsAHolderOfKeySubject) {
   EXPECT_FALSE(subject.delegateId.has_value());
 }
 
-TEST(ReadSubject, ReadsTheDelegateId) {
+TEST(ReadSubjectTest, ReadsTheDelegateId) {
   const ParsedSubject subject = Read(AssertionText(kNow).Delegate().subject);
   ASSERT_TRUE(subject.delegateId.has_value());
   EXPECT_EQ(subject.delegateId->name, "second");
@@ -73,7 +73,7 @@ TEST(ReadSubject, ReadsTheDelegateId) {
   EXPECT_EQ(subject.principal.name, "alice");
 }
 
-TEST(ReadSubject, ReadsTheDelegateIdAsAPrincipal) {
+TEST(ReadSubjectTest, ReadsTheDelegateIdAsAPrincipal) {
   const std::string text = AssertionText(kNow).Delegate().subject;
   EXPECT_EQ(Refusal(Replaced(text, "second@example.com", "second")),
             "Failed to parse the UPN NameID: `second'; name or domain part is missing.");
@@ -82,7 +82,7 @@ TEST(ReadSubject, ReadsTheDelegateIdAsAPrincipal) {
             "Invalid or unsupported NameId format 'https://schemas.xmlsoap.org/claims/UPN");
 }
 
-TEST(ReadSubject, SkipsWhiteSpaceAndComments) {
+TEST(ReadSubjectTest, SkipsWhiteSpaceAndComments) {
   std::string text = HolderOfKeyText();
   for (const char* tag : {"<saml2:NameID ", "<saml2:SubjectConfirmation ", "<ds:KeyInfo>",
                           "<ds:X509Data>", "<ds:X509Certificate>", "</ds:X509Data>"}) {
@@ -91,7 +91,7 @@ TEST(ReadSubject, SkipsWhiteSpaceAndComments) {
   EXPECT_EQ(Read(text).principal.name, "alice");
 }
 
-TEST(ReadSubject, ReadsTheTypeByItsExpandedName) {
+TEST(ReadSubjectTest, ReadsTheTypeByItsExpandedName) {
   const std::string type = R"(xsi:type="saml2:KeyInfoConfirmationDataType")";
   EXPECT_EQ(Read(Replaced(HolderOfKeyText(), type,
                           R"(xsi:type="KeyInfoConfirmationDataType" )"
@@ -106,7 +106,7 @@ TEST(ReadSubject, ReadsTheTypeByItsExpandedName) {
             HOLDER_OF_KEY);
 }
 
-TEST(ReadSubject, RefusesOtherTypesOfHolderOfKeyData) {
+TEST(ReadSubjectTest, RefusesOtherTypesOfHolderOfKeyData) {
   for (const std::string type :
        {"saml2:SubjectConfirmationDataType", "ds:KeyInfoConfirmationDataType",
         "KeyInfoConfirmationDataType", "", "saml2:KeyInfoConfirmationDataType "}) {
@@ -116,16 +116,15 @@ TEST(ReadSubject, RefusesOtherTypesOfHolderOfKeyData) {
   EXPECT_EQ(
       Refusal(Replaced(HolderOfKeyText(), R"(xsi:type="saml2:KeyInfoConfirmationDataType")", "")),
       "Node 'saml2:SubjectConfirmationData is missing required attribute 'xsi:type'");
-  EXPECT_EQ(
-      Refusal(Replaced(HolderOfKeyText(), "\"saml2:Key", "\"unbound:Key")),
-      "Element saml2:SubjectConfirmationDataat 1," +
-          std::to_string(("<root " + TestSupport::NamespaceDeclarations() + ">" + HolderOfKeyText())
-                             .find("<saml2:SubjectConfirmationData") +
-                         1) +
-          " uses undefined prefix: `unbound'");
+  EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), "\"saml2:Key", "\"unbound:Key")),
+            "Element saml2:SubjectConfirmationDataat 1," +
+                std::to_string(("<root " + NamespaceDeclarations() + ">" + HolderOfKeyText())
+                                   .find("<saml2:SubjectConfirmationData") +
+                               1) +
+                " uses undefined prefix: `unbound'");
 }
 
-TEST(ReadSubject, RefusesUnknownMethods) {
+TEST(ReadSubjectTest, RefusesUnknownMethods) {
   for (const std::string method :
        {"urn:oasis:names:tc:SAML:2.0:cm:sender-vouches", "",
         "urn:oasis:names:tc:SAML:2.0:cm:BEARER", "urn:oasis:names:tc:SAML:2.0:cm:bearer "}) {
@@ -134,7 +133,7 @@ TEST(ReadSubject, RefusesUnknownMethods) {
   }
 }
 
-// Where something stands behind an expected child, the innermost one first.
+// Places after an expected child, the innermost first.
 constexpr std::pair<const char*, const char*> kEnds[] = {
     {"</ds:X509Certificate>", "Unexpected elements after X509Certificate"},
     {"</ds:X509Data>", "Unexpected elements after X509Data"},
@@ -142,19 +141,20 @@ constexpr std::pair<const char*, const char*> kEnds[] = {
     {"</saml2:SubjectConfirmationData>", "Unexpected elements after SubjectConfirmationData"},
     {"</saml2:SubjectConfirmation>", "Unexpected elements after SubjectConfirmation"}};
 
-TEST(ReadSubject, RefusesWhatStandsBehindAnExpectedChild) {
+TEST(ReadSubjectTest, RefusesAnythingAfterAnExpectedChild) {
   for (const auto& [anchor, message] : kEnds) {
     for (const char* addition : {"<x/>", "text", "<?pi?>"}) {
-      EXPECT_EQ(Refusal(InsertedBehind(HolderOfKeyText(), anchor, addition)), message);
+      EXPECT_EQ(Refusal(InsertedAfter(HolderOfKeyText(), anchor, addition)), message);
     }
   }
 }
 
-// Something stands behind every child: each message shows once the children inside are repaired.
-TEST(ReadSubject, NamesTheInnermostFaultFirst) {
+// There is an unexpected element after every child. Each message appears once the inner ones are
+// repaired.
+TEST(ReadSubjectTest, NamesTheInnermostFaultFirst) {
   std::string text = HolderOfKeyText();
   for (const auto& [anchor, message] : kEnds) {
-    text = InsertedBehind(text, anchor, "<x/>");
+    text = InsertedAfter(text, anchor, "<x/>");
   }
   for (const auto& [anchor, message] : kEnds) {
     EXPECT_EQ(Refusal(text), message);
@@ -163,7 +163,7 @@ TEST(ReadSubject, NamesTheInnermostFaultFirst) {
   EXPECT_EQ(Read(text).principal.name, "alice");
 }
 
-TEST(ReadSubject, JudgesTheMethodBeforeWhatItConfirms) {
+TEST(ReadSubjectTest, ChecksTheMethodBeforeWhatItConfirms) {
   const std::string text = Replaced(BearerText(), "cm:bearer", "cm:other");
   EXPECT_EQ(Refusal(Replaced(text, "<saml2:SubjectConfirmationData ", "<x ")),
             "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:other'");
@@ -174,18 +174,18 @@ TEST(ReadSubject, JudgesTheMethodBeforeWhatItConfirms) {
             "Failed to parse the UPN NameID: `alice'; name or domain part is missing.");
 }
 
-TEST(ReadSubject, RefusesASecondCertificateOrConfirmation) {
-  EXPECT_EQ(Refusal(InsertedBehind(HolderOfKeyText(), "</ds:X509Certificate>",
-                                   "<ds:X509Certificate>AA==</ds:X509Certificate>")),
+TEST(ReadSubjectTest, RefusesASecondCertificateOrConfirmation) {
+  EXPECT_EQ(Refusal(InsertedAfter(HolderOfKeyText(), "</ds:X509Certificate>",
+                                  "<ds:X509Certificate>AA==</ds:X509Certificate>")),
             "Unexpected elements after X509Certificate");
   const std::string confirmation = BearerText().substr(
       BearerText().find("<saml2:SubjectConfirmation "),
       BearerText().find("</saml2:Subject>") - BearerText().find("<saml2:SubjectConfirmation "));
-  EXPECT_EQ(Refusal(InsertedBehind(BearerText(), "</saml2:SubjectConfirmation>", confirmation)),
+  EXPECT_EQ(Refusal(InsertedAfter(BearerText(), "</saml2:SubjectConfirmation>", confirmation)),
             "Unexpected elements after SubjectConfirmation");
 }
 
-TEST(ReadSubject, RefusesMissingParts) {
+TEST(ReadSubjectTest, RefusesMissingParts) {
   EXPECT_EQ(Refusal("<saml2:Subject/>"), "Expected element 'NameID' not found.");
   EXPECT_EQ(Refusal(Replaced(BearerText(), "</saml2:NameID>", "</saml2:NameID><x/>")),
             "Expected element 'SubjectConfirmation' not found.");
@@ -205,7 +205,7 @@ TEST(ReadSubject, RefusesMissingParts) {
             "Expected element 'SubjectConfirmationData' not found.");
 }
 
-TEST(ReadSubject, RefusesMissingKeyMaterial) {
+TEST(ReadSubjectTest, RefusesMissingKeyMaterial) {
   const std::string certificate = "<ds:X509Certificate>" +
                                   CertificateBody(TrustedCredential().certificatePem) +
                                   "</ds:X509Certificate>";
@@ -221,7 +221,7 @@ TEST(ReadSubject, RefusesMissingKeyMaterial) {
             "Element 'saml2:X509Data' has unexpected namespace");
 }
 
-TEST(ReadSubject, PassesThePlatformsFaultsOfACertificate) {
+TEST(ReadSubjectTest, PassesThePlatformsFaultsOfACertificate) {
   const std::string body = CertificateBody(TrustedCredential().certificatePem);
   EXPECT_THROW(Read(Replaced(HolderOfKeyText(), body, "not base64!")),
                Tarnik::Base64FormatException);
@@ -229,7 +229,7 @@ TEST(ReadSubject, PassesThePlatformsFaultsOfACertificate) {
                Tarnik::Crypto::CryptoException);
 }
 
-TEST(ReadSubject, LetsBearerDataNameItsType) {
+TEST(ReadSubjectTest, LetsBearerDataNameItsType) {
   for (const char* type :
        {"saml2:SubjectConfirmationDataType", "saml2:KeyInfoConfirmationDataType", "Untyped"}) {
     const ParsedSubject subject =
@@ -240,7 +240,7 @@ TEST(ReadSubject, LetsBearerDataNameItsType) {
   }
 }
 
-TEST(ReadSubject, RefusesBearerDataOfATypeThatCannotBeNamed) {
+TEST(ReadSubjectTest, RefusesBearerDataOfATypeThatCannotBeNamed) {
   const std::string text = "\n" + Replaced(BearerText(), "Z\"/>", "Z\" xsi:type=\"unbound:T\"/>");
   const std::size_t lineStart = 1;
   EXPECT_EQ(Refusal(text),
@@ -249,13 +249,13 @@ TEST(ReadSubject, RefusesBearerDataOfATypeThatCannotBeNamed) {
                 " uses undefined prefix: `unbound'");
 }
 
-// A type that calls for a key does not make room for one.
-TEST(ReadSubject, RefusesABearerKeyWhateverTheType) {
+// A type that requires a key does not allow one in bearer data.
+TEST(ReadSubjectTest, RefusesABearerKeyWhateverTheType) {
   EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), "cm:holder-of-key", "cm:bearer")),
             "Element 'saml2:SubjectConfirmationData' must be empty");
 }
 
-TEST(ReadSubject, RefusesBearerDataThatSaysMore) {
+TEST(ReadSubjectTest, RefusesBearerDataWithFurtherContent) {
   const std::string end = "Z\"/>";
   EXPECT_EQ(Refusal(Replaced(BearerText(), end, "Z\" Recipient=\"urn:r\"/>")),
             "Unexpected attribute 'Recipient' on element 'saml2:SubjectConfirmationData'");
@@ -268,7 +268,7 @@ TEST(ReadSubject, RefusesBearerDataThatSaysMore) {
       "Element 'saml2:SubjectConfirmationData' must be empty");
 }
 
-TEST(ReadSubject, RefusesUnexpectedAttributes) {
+TEST(ReadSubjectTest, RefusesUnexpectedAttributes) {
   const std::pair<const char*, const char*> cases[] = {
       {"<saml2:Subject", "saml2:Subject"},
       {"<ds:KeyInfo", "ds:KeyInfo"},
@@ -284,4 +284,4 @@ TEST(ReadSubject, RefusesUnexpectedAttributes) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,21 +1,21 @@
+#include <string>
+
+#include <devsts/xml_security.h>
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 
 #include "support/assertion_text.h"
 #include "support/thrown_message.h"
 #include "support/token_values.h"
 
-// Edits of a signed token's text: those that its canonical form ignores change nothing that a
-// caller sees, those of a value that is read are seen as tampering.
-namespace SsoClient {
+// Edits of a signed token's text: edits that its canonical form ignores change no value, and edits
+// of a value are refused as tampering.
+namespace SsoClient::Testing {
 namespace {
 
-using TestSupport::AllValues;
-using TestSupport::AssertionText;
-using TestSupport::Replaced;
-
 std::string SignedXml() {
-  static const std::string xml =
-      AssertionText().Delegate().ToSignedXml(TestSupport::TrustedCredential());
+  static const std::string xml = AssertionText().Delegate().ToSignedXml(TrustedCredential());
   return xml;
 }
 
@@ -24,17 +24,17 @@ struct Edit {
   const char* to;
 };
 
-class NeutralEdit : public testing::TestWithParam<Edit> {};
+class NeutralEditTest : public testing::TestWithParam<Edit> {};
 
-TEST_P(NeutralEdit, KeepsVerdictAndValues) {
-  const auto resolver = TestSupport::TrustedResolver();
+TEST_P(NeutralEditTest, KeepsVerdictAndValues) {
+  const auto resolver = TrustedResolver();
   const std::string edited = Replaced(SignedXml(), GetParam().from, GetParam().to);
   EXPECT_EQ(AllValues(*CreateSamlToken(edited, resolver.get())),
             AllValues(*CreateSamlToken(SignedXml(), resolver.get())));
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    CanonicalForm, NeutralEdit,
+    CanonicalForm, NeutralEditTest,
     testing::Values(Edit{"ID=\"_a1\"", "ID='_a1'"}, Edit{"ID=\"_a1\"", "ID = \n \"_a1\""},
                     Edit{"ID=\"_a1\"", "ID=\"_&#97;1\""},
                     Edit{"alice@example.com", "&#x61;lice@example.com"},
@@ -51,46 +51,44 @@ INSTANTIATE_TEST_SUITE_P(
                     Edit{"</saml2:Subject>", "<!----></saml2:Subject>"},
                     Edit{"<saml2:Subject>", "<saml2:Subject xmlns:unused=\"urn:unused\">"}));
 
-TEST(NeutralEdit, AcceptsTextAroundTheDocumentElement) {
-  const auto resolver = TestSupport::TrustedResolver();
+TEST(NeutralEditTest, AcceptsTextAroundTheDocumentElement) {
+  const auto resolver = TrustedResolver();
   EXPECT_EQ(AllValues(*CreateSamlToken("<?xml version=\"1.0\"?>\r\n<!--c-->" + SignedXml() + "\n",
                                        resolver.get())),
             AllValues(*CreateSamlToken(SignedXml(), resolver.get())));
 }
 
-// The name in xsi:type hangs on a declaration that exclusive canonical text leaves out where no
-// element or attribute uses it: whoever changes that changes nothing that is signed, and gains
+// The name in xsi:type depends on a declaration that exclusive canonical text omits if no element
+// or attribute uses its prefix. So it can be changed without breaking the signature, but that gains
 // nothing.
-TEST(PrefixEdit, OfATypesNamespaceLeavesNoTypeThatIsKnown) {
+TEST(PrefixEditTest, OfATypesNamespaceMakesTheTypeUnknown) {
   AssertionText text;
   text.advice.clear();
-  const std::string original = text.ToSignedXml(TestSupport::TrustedCredential());
-  const auto resolver = TestSupport::TrustedResolver();
+  const std::string original = text.ToSignedXml(TrustedCredential());
+  const auto resolver = TrustedResolver();
   EXPECT_TRUE(CreateSamlToken(original, resolver.get())->IsRenewable());
   const std::string condition = "<saml2:Condition xsi:type=\"rsa:RenewRestrictionType\"";
   for (const char* uri : {"urn:other", "urn:oasis:names:tc:SAML:2.0:conditions:delegation",
                           "urn:oasis:names:tc:SAML:2.0:assertion"}) {
     const std::string edited =
         Replaced(original, condition, condition + " xmlns:rsa=\"" + uri + "\"");
-    ASSERT_TRUE(DevSts::VerifyXml(edited, TestSupport::TrustedCredential().certificatePem));
-    EXPECT_EQ(TestSupport::ThrownMessage<ParseException>(
-                  [&] { CreateSamlToken(edited, resolver.get()); }),
+    ASSERT_TRUE(DevSts::VerifyXml(edited, TrustedCredential().certificatePem));
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(edited, resolver.get()); }),
               "Unknown or duplicate restriction node under Conditions");
   }
 }
 
-class ValueEdit : public testing::TestWithParam<Edit> {};
+class ValueEditTest : public testing::TestWithParam<Edit> {};
 
-TEST_P(ValueEdit, IsSeenAsTampering) {
+TEST_P(ValueEditTest, IsRefusedAsTampering) {
   const std::string edited = Replaced(SignedXml(), GetParam().from, GetParam().to);
-  // The twin: without a resolver nothing is wrong with the text.
+  // Control: without a resolver the text is accepted.
   EXPECT_NO_THROW(CreateSamlToken(edited));
-  EXPECT_THROW(CreateSamlToken(edited, TestSupport::TrustedResolver().get()),
-               InvalidSignatureException);
+  EXPECT_THROW(CreateSamlToken(edited, TrustedResolver().get()), InvalidSignatureException);
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    EveryValue, ValueEdit,
+    EveryValue, ValueEditTest,
     testing::Values(Edit{"https://sts.example.com/STS", "https://sts.example.com/STS2"},
                     Edit{"nameid-format:entity", "nameid-format:entitx"},
                     Edit{"alice@example.com", "alicf@example.com"},
@@ -108,4 +106,4 @@ INSTANTIATE_TEST_SUITE_P(
                     Edit{"<saml2:Subject>", "<saml2:Subject> "}));
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,19 +1,21 @@
-#include <ssoclient/saml_token.h>
-
 #include <algorithm>
+#include <cstddef>
 #include <ctime>
 #include <functional>
+#include <ostream>
+#include <string>
+
+#include <gtest/gtest.h>
+#include <ssoclient/saml_token.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/parse_xml.h"
 
-// The time that a token takes grows as its size does, whatever is in it.
-namespace SsoClient {
+// The time to read a token is linear in its size, whatever it contains.
+namespace SsoClient::Testing {
 namespace {
-
-using TestSupport::AssertionText;
-using TestSupport::InsertedBehind;
-using TestSupport::Replaced;
 
 std::string Repeated(const std::string& text, std::size_t count) {
   std::string result;
@@ -26,8 +28,8 @@ std::string Repeated(const std::string& text, std::size_t count) {
 AssertionText ManyAudiences(std::size_t count) {
   AssertionText text;
   text.conditions =
-      InsertedBehind(text.conditions, "<saml2:AudienceRestriction>",
-                     Repeated("<saml2:Audience>https://c.example</saml2:Audience>", count));
+      InsertedAfter(text.conditions, "<saml2:AudienceRestriction>",
+                    Repeated("<saml2:Audience>https://c.example</saml2:Audience>", count));
   return text;
 }
 
@@ -85,13 +87,13 @@ void PrintTo(const Shape& shape, std::ostream* stream) {
   *stream << shape.name;
 }
 
-class TokenScaling : public testing::TestWithParam<Shape> {
+class TokenScalingTest : public testing::TestWithParam<Shape> {
  protected:
   static std::string SignedXml(std::size_t factor) {
-    return GetParam().make(GetParam().count * factor).ToSignedXml(TestSupport::TrustedCredential());
+    return GetParam().make(GetParam().count * factor).ToSignedXml(TrustedCredential());
   }
 
-  // Each doubling may cost 2.5 times the time; a quadratic step costs four times.
+  // Each doubling may take 2.5 times as long; a quadratic step takes four times as long.
   static void ExpectLinear(const std::function<void(const std::string&)>& use) {
     const std::string small = SignedXml(1);
     const std::string large = SignedXml(4);
@@ -100,22 +102,21 @@ class TokenScaling : public testing::TestWithParam<Shape> {
     EXPECT_LT(largeTime, 2.5 * 2.5 * std::max(smallTime, 1e-3));
   }
 
-  const Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> resolver_ =
-      TestSupport::TrustedResolver();
+  const Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> resolver_ = TrustedResolver();
 };
 
-TEST_P(TokenScaling, OfVerifyingAText) {
+TEST_P(TokenScalingTest, VerifyingATextIsLinear) {
   ExpectLinear([&](const std::string& xml) { CreateSamlToken(xml, resolver_.get()); });
 }
 
-TEST_P(TokenScaling, OfVerifyingAnElementAndItsCanonicalText) {
+TEST_P(TokenScalingTest, VerifyingAnElementAndItsCanonicalTextIsLinear) {
   ExpectLinear([&](const std::string& xml) {
-    const auto document = TestSupport::ParseXml(xml);
+    const auto document = ParseXml(xml);
     CreateSamlTokenFromDom(document->RootElement(), resolver_.get());
   });
 }
 
-INSTANTIATE_TEST_SUITE_P(Shapes, TokenScaling,
+INSTANTIATE_TEST_SUITE_P(Shapes, TokenScalingTest,
                          testing::Values(Shape{"ManyAudiences", ManyAudiences, 2000},
                                          Shape{"ManyGroups", ManyGroups, 1500},
                                          Shape{"LongIssuer", LongIssuer, 5000},
@@ -124,4 +125,4 @@ INSTANTIATE_TEST_SUITE_P(Shapes, TokenScaling,
                          [](const auto& test) { return test.param.name; });
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,25 +1,33 @@
 #include "token/token_signature.h"
 
+#include <cstddef>
+#include <functional>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/private_key.h>
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/key_info_resolver.h>
+#include <tarnik/xml/security/signature.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 
-#include <functional>
-
 #include "support/assertion_text.h"
-#include "support/parsed_xml.h"
+#include "support/fragment.h"
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::Ref;
 using Tarnik::Xml::Security::KeyInfoResolver;
 using Tarnik::Xml::Security::Signature;
-using TestSupport::Fragment;
-using TestSupport::MadeUpSignature;
-using TestSupport::Replaced;
-using TestSupport::ThrownMessage;
 
 std::string Refusal(const std::string& content, const std::string& id = "_a1") {
   Fragment fragment(content);
@@ -41,17 +49,17 @@ std::string WithSecondReference(const std::string& signature, const std::string&
   return signature.substr(0, end) + second + signature.substr(end);
 }
 
-TEST(ReadSignature, AcceptsAReferenceToTheAssertionOrTheDocument) {
+TEST(ReadSignatureTest, AcceptsAReferenceToTheAssertionOrTheDocument) {
   ExpectCovers(MadeUpSignature("#_a1"));
   ExpectCovers(MadeUpSignature(""));
 }
 
-TEST(ReadSignature, AcceptsOneCoveringReferenceAmongSeveral) {
+TEST(ReadSignatureTest, AcceptsOneCoveringReferenceAmongSeveral) {
   ExpectCovers(WithSecondReference(MadeUpSignature("#_a1"), "#other"));
   ExpectCovers(WithSecondReference(MadeUpSignature("#other"), "#_a1"));
 }
 
-TEST(ReadSignature, RefusesReferencesToElsewhere) {
+TEST(ReadSignatureTest, RefusesReferencesToElsewhere) {
   for (const char* uri : {"#other", "#", "_a1", "#_a", "#_a11", "##_a1", "#_A1", "#_a1 ", " #_a1",
                           "#xpointer(id('_a1'))", "#xpointer(/)", "urn:x#_a1"}) {
     EXPECT_EQ(Refusal(MadeUpSignature(uri)), "Token's signature must cover the entire token")
@@ -61,13 +69,13 @@ TEST(ReadSignature, RefusesReferencesToElsewhere) {
             "Token's signature must cover the entire token");
 }
 
-TEST(ReadSignature, RefusesAnythingButAnElementInItsPlace) {
+TEST(ReadSignatureTest, RefusesAnythingButAnElementInItsPlace) {
   for (const char* content : {"", "text", "<?pi?>", " <!--c--> "}) {
     EXPECT_EQ(Refusal(content), "Expected element ds:Signature not found");
   }
 }
 
-TEST(ReadSignature, TellsThePlatformsSyntaxFault) {
+TEST(ReadSignatureTest, ReportsThePlatformsSyntaxError) {
   const std::string cases[] = {
       "<saml2:Subject/>",
       "<Signature/>",
@@ -89,7 +97,7 @@ std::string WithKeyInfo(const std::string& signature, const std::string& content
                   "</ds:SignatureValue><ds:KeyInfo>" + content + "</ds:KeyInfo>");
 }
 
-TEST(ReadSignature, RefusesSamlElementsAnywhereInKeyInfo) {
+TEST(ReadSignatureTest, RefusesSamlElementsAnywhereInKeyInfo) {
   for (const char* content :
        {"<saml2:Assertion/>", "<saml2:Anything/>",
         "<Assertion xmlns=\"urn:oasis:names:tc:SAML:2.0:assertion\"/>",
@@ -107,7 +115,7 @@ TEST(ReadSignature, RefusesSamlElementsAnywhereInKeyInfo) {
   }
 }
 
-TEST(ReadSignature, JudgesFormThenCoverageThenKeyInfo) {
+TEST(ReadSignatureTest, ChecksFormThenCoverageThenKeyInfo) {
   const std::string uncovering = WithKeyInfo(MadeUpSignature("#other"), "<saml2:Assertion/>");
   EXPECT_EQ(Refusal(Replaced(uncovering, "<ds:DigestValue>AA", "<ds:DigestValue>AA<!---->"))
                 .rfind("Signature syntax error: ", 0),
@@ -115,7 +123,7 @@ TEST(ReadSignature, JudgesFormThenCoverageThenKeyInfo) {
   EXPECT_EQ(Refusal(uncovering), "Token's signature must cover the entire token");
 }
 
-// A signature whose verdict the test gives.
+// A signature whose verdict the test sets.
 class FakeSignature final : public Signature, public Tarnik::ObjectImpl {
  public:
   explicit FakeSignature(std::function<bool(const KeyInfoResolver*)> verify)
@@ -143,8 +151,8 @@ class FakeSignature final : public Signature, public Tarnik::ObjectImpl {
   Tarnik::Xml::Security::KeyInfo keyInfo_;
 };
 
-TEST(VerifySignature, AcceptsATrueVerdictOfTheGivenResolver) {
-  const Ref<const KeyInfoResolver> resolver = TestSupport::TrustedResolver();
+TEST(VerifySignatureTest, AcceptsATrueVerdictOfTheGivenResolver) {
+  const Ref<const KeyInfoResolver> resolver = TrustedResolver();
   const KeyInfoResolver* seen = nullptr;
   const auto signature = Tarnik::MakeRef<FakeSignature>([&](const KeyInfoResolver* given) {
     seen = given;
@@ -154,14 +162,14 @@ TEST(VerifySignature, AcceptsATrueVerdictOfTheGivenResolver) {
   EXPECT_EQ(seen, resolver.get());
 }
 
-TEST(VerifySignature, RefusesAFalseVerdict) {
+TEST(VerifySignatureTest, RefusesAFalseVerdict) {
   const auto signature =
       Tarnik::MakeRef<FakeSignature>([](const KeyInfoResolver*) { return false; });
   EXPECT_EQ(ThrownMessage<InvalidSignatureException>([&] { VerifySignature(*signature, nullptr); }),
             "Failed to verify signature: token might have been tampered with.");
 }
 
-TEST(VerifySignature, TellsThePlatformsFault) {
+TEST(VerifySignatureTest, ReportsThePlatformsError) {
   const auto signature = Tarnik::MakeRef<FakeSignature>([](const KeyInfoResolver*) -> bool {
     throw Tarnik::Xml::Security::XmlSecurityException("no trusted key");
   });
@@ -169,7 +177,7 @@ TEST(VerifySignature, TellsThePlatformsFault) {
             "Signature verification error. no trusted key");
 }
 
-TEST(VerifySignature, PassesOtherFaults) {
+TEST(VerifySignatureTest, PassesOtherErrorsOn) {
   const auto signature = Tarnik::MakeRef<FakeSignature>([](const KeyInfoResolver*) -> bool {
     throw Tarnik::InvalidStateException("resolver broken");
   });
@@ -179,4 +187,4 @@ TEST(VerifySignature, PassesOtherFaults) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,17 +1,21 @@
 #include "token/validity_rules.h"
 
 #include <limits>
+#include <string>
+#include <vector>
 
+#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
+#include <ssoclient/principal_id.h>
+#include <tarnik/system/date_time.h>
 
 #include "support/thrown_message.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::System::DateTime;
 using Tarnik::System::DateTimeFromUtc;
-using TestSupport::ThrownMessage;
 
 constexpr long kSecond = 1'000'000;
 constexpr long kStart = 1'709'622'489'010'000;  // 2024-03-05T07:08:09.010Z
@@ -33,7 +37,7 @@ ParsedAssertion ValidAssertion() {
   return assertion;
 }
 
-// "" if the assertion is accepted.
+// The error message; "" if the assertion is accepted.
 std::string Refusal(const ParsedAssertion& assertion, long tolerance = 600, long now = kStart) {
   try {
     CheckValidity(assertion, tolerance, At(now));
@@ -46,14 +50,14 @@ std::string Refusal(const ParsedAssertion& assertion, long tolerance = 600, long
 constexpr char kInFuture[] = "Token start date is in the future: 2024-03-05T07:08:09.010Z";
 constexpr char kExpired[] = "The token has expired at: 2024-03-05T08:08:09.010Z";
 
-TEST(ToleranceMicroseconds, StopsAtTheEndsOf64Bits) {
+TEST(ToleranceMicrosecondsTest, StopsAtTheEndsOf64Bits) {
   EXPECT_EQ(ToleranceMicroseconds(600), 600'000'000);
   EXPECT_EQ(ToleranceMicroseconds(-1), -1'000'000);
   EXPECT_EQ(ToleranceMicroseconds(kLongest), kLongest);
   EXPECT_EQ(ToleranceMicroseconds(kShortest), kShortest);
 }
 
-TEST(CheckValidity, AcceptsOnlyVersion20) {
+TEST(CheckValidityTest, AcceptsOnlyVersion20) {
   EXPECT_EQ(Refusal(ValidAssertion()), "");
   for (const char* version : {"2.0 ", " 2.0", "2", "2.00", "1.1", ""}) {
     ParsedAssertion assertion = ValidAssertion();
@@ -62,7 +66,7 @@ TEST(CheckValidity, AcceptsOnlyVersion20) {
   }
 }
 
-TEST(CheckValidity, WantsAnIdThatBeginsWithAnUnderscore) {
+TEST(CheckValidityTest, RequiresAnIdThatBeginsWithAnUnderscore) {
   for (const char* id : {"", "a1", " _a1", "-_"}) {
     ParsedAssertion assertion = ValidAssertion();
     assertion.id = id;
@@ -73,7 +77,7 @@ TEST(CheckValidity, WantsAnIdThatBeginsWithAnUnderscore) {
   EXPECT_EQ(Refusal(underscore), "");
 }
 
-TEST(CheckValidity, WantsAPeriodThatIsNotEmpty) {
+TEST(CheckValidityTest, RequiresAPeriodThatIsNotEmpty) {
   const std::string message =
       "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.";
   for (const long end : {kStart, kStart - 1}) {
@@ -94,14 +98,14 @@ struct ClockCase {
   std::string refusal;
 };
 
-class CheckValidityAtTime : public testing::TestWithParam<ClockCase> {};
+class CheckValidityAtTimeTest : public testing::TestWithParam<ClockCase> {};
 
-TEST_P(CheckValidityAtTime, JudgesThePeriod) {
+TEST_P(CheckValidityAtTimeTest, ChecksThePeriod) {
   EXPECT_EQ(Refusal(ValidAssertion(), GetParam().tolerance, GetParam().now), GetParam().refusal);
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Clock, CheckValidityAtTime,
+    Clock, CheckValidityAtTimeTest,
     testing::Values(
         // the start
         ClockCase{kStart, 0, ""}, ClockCase{kStart - 1, 0, kInFuture},
@@ -115,14 +119,14 @@ INSTANTIATE_TEST_SUITE_P(
         // a negative tolerance narrows the period
         ClockCase{kStart + 1, -1, kInFuture}, ClockCase{kStart + kSecond, -1, ""},
         ClockCase{kEnd - kSecond, -1, kExpired}, ClockCase{kEnd - kSecond - 1, -1, ""},
-        // tolerances that 64 bits of microseconds can not hold
+        // tolerances that do not fit into 64 bits of microseconds
         ClockCase{kEnd + 1'000'000 * kSecond, kLongest, ""},
         ClockCase{kStart - 1'000'000 * kSecond, kLongest, ""},
         ClockCase{kStart + 1, kShortest, kInFuture},
         ClockCase{kEnd + 1, kLongest / kSecond + 1, ""}));
 
-// The text form of a time tells it in the zone that it was written in.
-TEST(CheckValidity, NamesTimesAsTheTokenWroteThem) {
+// The text form of a time is in the zone in which it was written.
+TEST(CheckValidityTest, NamesTimesAsTheTokenWroteThem) {
   ParsedAssertion assertion = ValidAssertion();
   assertion.conditions.notBefore = DateTime::Parse("2024-03-05T09:08:09.010+02:00");
   assertion.conditions.notOnOrAfter = DateTime::Parse("2024-03-05T03:08:09.010-05:00");
@@ -132,7 +136,7 @@ TEST(CheckValidity, NamesTimesAsTheTokenWroteThem) {
   EXPECT_EQ(Refusal(assertion, 0, kEnd - 1), "");
 }
 
-TEST(CheckValidity, WantsABearerConfirmationAsLongAsTheToken) {
+TEST(CheckValidityTest, RequiresABearerConfirmationAsLongAsTheToken) {
   ParsedAssertion assertion = ValidAssertion();
   EXPECT_EQ(Refusal(assertion), "");
   assertion.subject.notOnOrAfter = At(kEnd - 1);
@@ -141,7 +145,7 @@ TEST(CheckValidity, WantsABearerConfirmationAsLongAsTheToken) {
   EXPECT_EQ(Refusal(assertion), "");
 }
 
-TEST(CheckValidity, LeavesTheConfirmationPeriodOfHolderOfKey) {
+TEST(CheckValidityTest, LeavesTheConfirmationPeriodOfHolderOfKey) {
   ParsedAssertion assertion = ValidAssertion();
   assertion.subject.confirmationMethod = HOLDER_OF_KEY;
   assertion.subject.notOnOrAfter = At(0);
@@ -152,7 +156,7 @@ std::vector<Delegate> Chain() {
   return {{{"first", "d"}, At(kStart)}, {{"second", "d"}, At(kStart)}};
 }
 
-TEST(CheckValidity, WantsDelegateIdAndRestrictionTogether) {
+TEST(CheckValidityTest, RequiresDelegateIdAndRestrictionTogether) {
   ParsedAssertion restriction = ValidAssertion();
   restriction.conditions.delegationChain = Chain();
   EXPECT_EQ(Refusal(restriction),
@@ -165,7 +169,7 @@ TEST(CheckValidity, WantsDelegateIdAndRestrictionTogether) {
             "present");
 }
 
-TEST(CheckValidity, WantsTheDelegateIdOfTheLastDelegate) {
+TEST(CheckValidityTest, RequiresTheDelegateIdOfTheLastDelegate) {
   ParsedAssertion assertion = ValidAssertion();
   assertion.conditions.delegationChain = Chain();
   assertion.subject.delegateId = PrincipalId{"second", "d"};
@@ -187,7 +191,7 @@ TEST(CheckValidity, WantsTheDelegateIdOfTheLastDelegate) {
             "The SubjectConfirmation delegate id does not match the id of the last delegate");
 }
 
-TEST(CheckValidity, AppliesItsRulesInOrder) {
+TEST(CheckValidityTest, AppliesItsRulesInOrder) {
   ParsedAssertion assertion;
   assertion.version = "1.1";
   assertion.id = "a1";
@@ -213,4 +217,4 @@ TEST(CheckValidity, AppliesItsRulesInOrder) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -16,8 +16,8 @@
 
 namespace SsoClient::Testing {
 
-/// Records what a connection's completion is called with. It waits until the last copy of the
-/// completion is gone, so that a second call cannot come unseen.
+/// Records the arguments of a connection's completion. It waits until the last copy of the
+/// completion is destroyed, so that a second call cannot go unnoticed.
 class ConnectRecorder {
  public:
   Tarnik::Http::CustomConnectionSpec::ConnectCompletion Completion() {

@@ -1,11 +1,13 @@
 #include "transport/exchange_outcome.h"
 
-#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
 
 #include "transport/fake_http.h"
 #include "transport/read_all.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 TEST(ExchangeOutcomeTest, AFailureKeepsItsMessage) {
@@ -15,14 +17,14 @@ TEST(ExchangeOutcomeTest, AFailureKeepsItsMessage) {
   EXPECT_EQ(outcome.failure->Message(), "No answer in time.");
 }
 
-TEST(ExchangeOutcomeTest, AnAnswerIsTwoHundredsAndFiveHundred) {
+TEST(ExchangeOutcomeTest, StatusCodes200To299And500AreAnswers) {
   for (const int code : {200, 201, 202, 204, 250, 299, 500}) {
-    const auto response = Tarnik::MakeRef<Testing::FakeResponse>(code, "Any", "the body");
+    const auto response = Tarnik::MakeRef<FakeResponse>(code, "Any", "the body");
     const auto outcome = InterpretResponse(*response);
     EXPECT_FALSE(outcome.failure) << code;
     ASSERT_NE(outcome.body, nullptr) << code;
     EXPECT_EQ(outcome.body, response->Body());
-    EXPECT_EQ(Testing::ReadAll(*outcome.body), "the body");
+    EXPECT_EQ(ReadAll(*outcome.body), "the body");
   }
 }
 
@@ -49,8 +51,7 @@ TEST(ExchangeOutcomeTest, AnyOtherStatusIsAFailureThatNamesIt) {
       {999, "Last", "Server returned error: 999 Last"},
   };
   for (const auto& test : kCases) {
-    const auto outcome =
-        InterpretResponse(*Tarnik::MakeRef<Testing::FakeResponse>(test.code, test.reason));
+    const auto outcome = InterpretResponse(*Tarnik::MakeRef<FakeResponse>(test.code, test.reason));
     EXPECT_EQ(outcome.body, nullptr);
     ASSERT_TRUE(outcome.failure) << test.code;
     EXPECT_EQ(outcome.failure->Message(), test.message);
@@ -58,7 +59,7 @@ TEST(ExchangeOutcomeTest, AnyOtherStatusIsAFailureThatNamesIt) {
 }
 
 TEST(ExchangeOutcomeTest, AFailureToReadTheResponseIsAFailureOfTheExchange) {
-  const auto response = Tarnik::MakeRef<Testing::FakeResponse>(200, "OK");
+  const auto response = Tarnik::MakeRef<FakeResponse>(200, "OK");
   response->bodyFailure = "The body is gone.";
   const auto outcome = InterpretResponse(*response);
   EXPECT_EQ(outcome.body, nullptr);
@@ -67,4 +68,4 @@ TEST(ExchangeOutcomeTest, AFailureToReadTheResponseIsAFailureOfTheExchange) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

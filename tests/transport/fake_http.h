@@ -7,8 +7,10 @@
 #include <utility>
 #include <vector>
 
+#include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
 #include <tarnik/http/http_response.h>
 #include <tarnik/http/http_user_agent.h>
 
@@ -40,7 +42,7 @@ class FakePendingItem final : public Tarnik::Http::PendingRequestItem, public Ta
   bool Cancel() override { return true; }
 };
 
-/// Keeps what it is given; `onWait` gives what `Wait` returns or throws.
+/// Records what it is given. `onWait` supplies what `Wait` returns or throws.
 class FakeUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::ObjectImpl {
  public:
   Tarnik::Ref<Tarnik::Http::PendingRequestItem> SendAsync(

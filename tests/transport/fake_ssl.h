@@ -2,6 +2,7 @@
 #define SSOCLIENT_TESTS_TRANSPORT_FAKE_SSL_H
 
 #include <atomic>
+#include <cstddef>
 #include <optional>
 #include <string>
 #include <utility>
@@ -38,8 +39,8 @@ class FakeSslStream final : public Tarnik::Ssl::SSLStream, public Tarnik::Object
   Tarnik::Ref<Tarnik::System::Stream> below_;
 };
 
-/// Records what its streams are asked for. Handshakes fail with `handshakeFailure` if it is set,
-/// and do not even begin, with `handshakeRefusal`, if that is.
+/// Records the calls of its streams. Handshakes fail with `handshakeFailure` if it is set. If
+/// `handshakeRefusal` is set, they throw it before they begin.
 class FakeSslContext final : public Tarnik::Ssl::SSLContext, public Tarnik::ObjectImpl {
  public:
   Tarnik::Ref<Tarnik::Ssl::SSLStream> WrapStream(Tarnik::System::Stream* stream,

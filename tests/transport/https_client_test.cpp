@@ -1,11 +1,17 @@
 #include "transport/https_client.h"
 
-#include <gmock/gmock.h>
-#include <ssoclient/exceptions.h>
-#include <tarnik/http/http_url.h>
-
+#include <memory>
 #include <string>
 #include <type_traits>
+
+#include <gmock/gmock.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/http_url.h>
+#include <tarnik/ssl/ssl_context.h>
 
 #include "support/thrown_message.h"
 #include "support/vtable_slot.h"
@@ -14,12 +20,11 @@
 #include "transport/loopback_server.h"
 #include "transport/read_all.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using testing::HasSubstr;
 using testing::Not;
-using TestSupport::ThrownMessage;
 
 constexpr unsigned long kTimeout = 240'000'000;
 
@@ -28,7 +33,7 @@ std::string Send(TransportSession& session) {
   request.action = "urn:a";
   Tarnik::Ref<Tarnik::Reader> reader;
   session.SendRequest(request, reader);
-  return Testing::ReadAll(*reader);
+  return ReadAll(*reader);
 }
 
 std::string ConstructionFailure(const std::string& url, Tarnik::Ssl::SSLContext* context) {
@@ -45,12 +50,12 @@ TEST(HttpsClientTest, PlainHttpNeedsNoSslContext) {
 TEST(HttpsClientTest, HttpsNeedsAnSslContext) {
   EXPECT_EQ(ConstructionFailure("https://sts.example/path", nullptr),
             "HTTPS connection requested but no SSLContext provided.");
-  const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
+  const auto context = Tarnik::MakeRef<FakeSslContext>();
   EXPECT_EQ(ConstructionFailure("https://sts.example/path", context.get()), kNoFailure);
 }
 
 TEST(HttpsClientTest, KeepsTheSslContextAliveAndDropsItWithItself) {
-  const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
+  const auto context = Tarnik::MakeRef<FakeSslContext>();
   {
     const HttpsClient client("https://sts.example/", context.get(), "", kTimeout, false);
     EXPECT_EQ(context->RefCount(), 2);
@@ -74,7 +79,7 @@ TEST(HttpsClientTest, PassesOnWhatTheUrlParserRefuses) {
 }
 
 TEST(HttpsClientTest, PostsToThePathOfTheUrl) {
-  const Testing::LoopbackServer server([](const std::string&) { return Testing::OkAnswer("ok"); });
+  const LoopbackServer server([](const std::string&) { return OkAnswer("ok"); });
   for (const bool flag : {false, true}) {
     const HttpsClient client(server.Url("/sts/STSService?a=b"), nullptr, "", kTimeout, flag);
     EXPECT_EQ(Send(*client.CreateSession()), "ok");
@@ -87,8 +92,8 @@ TEST(HttpsClientTest, PostsToThePathOfTheUrl) {
 }
 
 TEST(HttpsClientTest, PlainHttpIgnoresTheSslContext) {
-  const Testing::LoopbackServer server([](const std::string&) { return Testing::OkAnswer("ok"); });
-  const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
+  const LoopbackServer server([](const std::string&) { return OkAnswer("ok"); });
+  const auto context = Tarnik::MakeRef<FakeSslContext>();
   const HttpsClient client(server.Url("/"), context.get(), "peer", kTimeout, false);
   EXPECT_EQ(Send(*client.CreateSession()), "ok");
   EXPECT_EQ(context->wraps, 0);
@@ -96,8 +101,8 @@ TEST(HttpsClientTest, PlainHttpIgnoresTheSslContext) {
 }
 
 TEST(HttpsClientTest, HandsThePeerNameToTheHandshake) {
-  const Testing::LoopbackServer server([](const std::string&) { return Testing::OkAnswer("ok"); });
-  const auto context = Tarnik::MakeRef<Testing::FakeSslContext>();
+  const LoopbackServer server([](const std::string&) { return OkAnswer("ok"); });
+  const auto context = Tarnik::MakeRef<FakeSslContext>();
   const std::string url = "https://127.0.0.1:" + std::to_string(server.Port()) + "/";
   const HttpsClient client(url, context.get(), "sts.example", kTimeout, false);
   EXPECT_EQ(Send(*client.CreateSession()), "ok");
@@ -107,8 +112,8 @@ TEST(HttpsClientTest, HandsThePeerNameToTheHandshake) {
 }
 
 TEST(HttpsClientTest, CookiesLiveAsLongAsTheSession) {
-  const Testing::LoopbackServer server(
-      [](const std::string&) { return Testing::OkAnswer("ok", "Set-Cookie: leg=1; Path=/\r\n"); });
+  const LoopbackServer server(
+      [](const std::string&) { return OkAnswer("ok", "Set-Cookie: leg=1; Path=/\r\n"); });
   const HttpsClient client(server.Url("/sts"), nullptr, "", kTimeout, false);
   const auto session = client.CreateSession();
   Send(*session);
@@ -122,13 +127,13 @@ TEST(HttpsClientTest, CookiesLiveAsLongAsTheSession) {
 }
 
 TEST(HttpsClientTest, EndsTheExchangeAtItsTimeOut) {
-  const Testing::LoopbackServer server([](const std::string&) { return std::string(); });
+  const LoopbackServer server([](const std::string&) { return std::string(); });
   const HttpsClient client(server.Url("/"), nullptr, "", 50'000, false);
   EXPECT_THROW(Send(*client.CreateSession()), CommunicationException);
 }
 
 TEST(HttpsClientTest, SharesTheCallersUserAgentAmongSessions) {
-  const auto agent = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  const auto agent = Tarnik::MakeRef<FakeUserAgent>();
   {
     const HttpsClient client(agent.get(), "not a URL but used as it is", kTimeout);
     EXPECT_EQ(agent->RefCount(), 2);
@@ -141,7 +146,7 @@ TEST(HttpsClientTest, SharesTheCallersUserAgentAmongSessions) {
 }
 
 TEST(HttpsClientTest, GivesSessionsItsPathAndTimeOut) {
-  const auto agent = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  const auto agent = Tarnik::MakeRef<FakeUserAgent>();
   const HttpsClient client(agent.get(), "/target", kTimeout);
   EXPECT_EQ(Send(*client.CreateSession()), "answer");
   EXPECT_THAT(agent->waitTimeouts, testing::ElementsAre(kTimeout));
@@ -155,14 +160,14 @@ TEST(HttpsClientTest, RefusesANullUserAgent) {
             "The HTTP user agent must not be null.");
 }
 
-TEST(HttpsClientTest, CreateSessionIsTheOneSlot) {
+TEST(HttpsClientTest, CreateSessionIsTheOnlySlot) {
   static_assert(!std::has_virtual_destructor_v<Transport>);
-  const auto agent = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  const auto agent = Tarnik::MakeRef<FakeUserAgent>();
   const HttpsClient client(agent.get(), "/", kTimeout);
   const Transport& transport = client;
   using Create = std::shared_ptr<TransportSession>(const void*);
-  EXPECT_EQ(Send(*TestSupport::VtableSlot<Create>(&transport, 0)(&transport)), "answer");
+  EXPECT_EQ(Send(*VtableSlot<Create>(&transport, 0)(&transport)), "answer");
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

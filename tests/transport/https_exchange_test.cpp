@@ -1,11 +1,5 @@
 #include "transport/https_client.h"
 
-#include <devsts/server.h>
-#include <gmock/gmock.h>
-#include <ssoclient/exceptions.h>
-#include <tarnik/crypto/certificate.h>
-#include <tarnik/ssl/ssl_context.h>
-
 #include <atomic>
 #include <chrono>
 #include <future>
@@ -14,10 +8,20 @@
 #include <tuple>
 #include <typeinfo>
 
+#include <devsts/server.h>
+#include <gmock/gmock.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/http/http_user_agent.h>
+#include <tarnik/ssl/ssl_context.h>
+
 #include "transport/loopback_server.h"
 #include "transport/read_all.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Clock = std::chrono::steady_clock;
@@ -29,7 +33,7 @@ using testing::Not;
 
 constexpr unsigned long kTimeout = 300'000;
 constexpr unsigned long kAmpleTimeout = 30'000'000;
-// A multiple of the time limit that even a busy machine keeps, and far below every answer's delay.
+// A multiple of the time limit, enough for a busy machine and far below the delay of every answer.
 constexpr std::chrono::seconds kBound{10};
 
 constexpr char kAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";
@@ -37,7 +41,7 @@ constexpr char kAnswer[] = "<answer/>";
 
 enum class Scheme { Http, Https };
 
-/// What came of one exchange, copied while its arguments were valid.
+/// The result of one exchange, copied while its arguments were valid.
 struct Result {
   std::string body;
   std::string errorType;
@@ -56,7 +60,7 @@ Result SendAndWait(const TransportSession& session, const SoapRequest& request) 
     EXPECT_EQ(reader, nullptr);
     return {"", typeid(error).name(), error.Message()};
   }
-  return {Testing::ReadAll(*reader), "", ""};
+  return {ReadAll(*reader), "", ""};
 }
 
 class AsyncExchange {
@@ -71,7 +75,7 @@ class AsyncExchange {
           }
           state->result.set_value(error != nullptr
                                       ? Result{"", typeid(*error).name(), error->Message()}
-                                      : Result{Testing::ReadAll(*reader), "", ""});
+                                      : Result{ReadAll(*reader), "", ""});
         },
         handle_);
   }
@@ -81,7 +85,7 @@ class AsyncExchange {
   int Calls() const { return state_->calls; }
 
  private:
-  // Shared with the completion, which may still be leaving when the result is here.
+  // Shared with the completion, which may not have returned yet when the result is available.
   struct State {
     std::atomic<int> calls = 0;
     std::promise<Result> result;
@@ -218,7 +222,7 @@ INSTANTIATE_TEST_SUITE_P(Drip, TimedOutExchangeTest,
 
 using CancelledExchangeTest = StalledExchangeTest;
 
-TEST_P(CancelledExchangeTest, TheHandleCallsTheExchangeOff) {
+TEST_P(CancelledExchangeTest, TheHandleCancelsTheExchange) {
   const auto session = MakeClient(TestedScheme(), kAmpleTimeout).CreateSession();
   AsyncExchange exchange(*session, request_);
   ASSERT_TRUE(IsStalled());
@@ -238,7 +242,7 @@ INSTANTIATE_TEST_SUITE_P(Stalls, CancelledExchangeTest,
                          NameOf);
 
 TEST_F(HttpsExchangeTest, AConnectionThatIsNeverAcceptedRunsIntoTheLimit) {
-  const Testing::FullListener listener;
+  const FullListener listener;
   const std::string endpoint = "127.0.0.1:" + std::to_string(listener.Port());
   const HttpsClient client("http://" + endpoint + "/", nullptr, "", kTimeout, false);
   const std::string expected = "No answer from " + endpoint + " within 300 milliseconds.";
@@ -254,7 +258,7 @@ TEST_F(HttpsExchangeTest, AConnectionThatIsNeverAcceptedRunsIntoTheLimit) {
   EXPECT_EQ(asynchronous.message, expected);
 }
 
-TEST_F(HttpsExchangeTest, ASessionGoesOnAfterAnExchangeThatWasCalledOff) {
+TEST_F(HttpsExchangeTest, ASessionWorksAfterACancelledExchange) {
   Answer(200, "OK");
   Sts().MisbehaveNext(MisbehaviorAt({"", Stall::InMidBody, false}));
   const auto session = MakeClient(Scheme::Https, kAmpleTimeout).CreateSession();
@@ -268,7 +272,7 @@ TEST_F(HttpsExchangeTest, ASessionGoesOnAfterAnExchangeThatWasCalledOff) {
   EXPECT_NE(requests[0].connectionId, requests[1].connectionId);
 }
 
-TEST_F(HttpsExchangeTest, AnAnswerThatHasComeCannotBeCalledOff) {
+TEST_F(HttpsExchangeTest, AReceivedAnswerCannotBeCancelled) {
   Answer(200, "OK");
   const auto session = MakeClient(Scheme::Https, kAmpleTimeout).CreateSession();
   AsyncExchange exchange(*session, request_);
@@ -277,7 +281,7 @@ TEST_F(HttpsExchangeTest, AnAnswerThatHasComeCannotBeCalledOff) {
   EXPECT_EQ(exchange.Calls(), 1);
 }
 
-TEST_F(HttpsExchangeTest, APeerNameThatIsNoneIsAFailureOfTheExchange) {
+TEST_F(HttpsExchangeTest, AMalformedPeerNameIsAFailureOfTheExchange) {
   const auto client = MakeClient(Scheme::Https, kAmpleTimeout, "no name");
   const auto session = client.CreateSession();
   for (const auto& result :
@@ -289,7 +293,7 @@ TEST_F(HttpsExchangeTest, APeerNameThatIsNoneIsAFailureOfTheExchange) {
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
-TEST_F(HttpsExchangeTest, CookiesGoBackOnTheSameSessionAlone) {
+TEST_F(HttpsExchangeTest, CookiesGoBackOnTheSameSessionOnly) {
   Answer(200, "OK");
   Misbehavior giving;
   giving.httpAnswer = DevSts::HttpAnswer{200, "OK", {}, kAnswer};
@@ -376,8 +380,8 @@ INSTANTIATE_TEST_SUITE_P(Statuses, RefusedStatusTest,
                                          Status{503, "Service Unavailable"}),
                          [](const auto& tested) { return std::to_string(tested.param.code); });
 
-// An interim answer is no answer (RFC 9110, section 15.2): nothing but a final one can follow.
-TEST_F(HttpsExchangeTest, AnInterimStatusAloneIsAFailure) {
+// An interim answer is not the final answer, which must follow it (RFC 9110, section 15.2).
+TEST_F(HttpsExchangeTest, AnInterimStatusWithoutAFinalOneIsAFailure) {
   for (const char* interim : {"HTTP/1.1 199 Odd\r\n\r\n", "HTTP/1.1 100 Continue\r\n\r\n"}) {
     Misbehavior misbehavior;
     misbehavior.rawAnswer = interim;
@@ -392,7 +396,7 @@ TEST_F(HttpsExchangeTest, AnInterimStatusAloneIsAFailure) {
   }
 }
 
-TEST_F(HttpsExchangeTest, TheActionStandsBetweenQuotes) {
+TEST_F(HttpsExchangeTest, TheActionIsQuoted) {
   Answer(200, "OK");
   const auto session = MakeClient(Scheme::Https, kAmpleTimeout).CreateSession();
   for (const std::string action : {kAction, "urn:a b", ""}) {
@@ -407,7 +411,7 @@ TEST_F(HttpsExchangeTest, TheActionStandsBetweenQuotes) {
   }
 }
 
-TEST_F(HttpsExchangeTest, NoFailureTellsWhatWasSent) {
+TEST_F(HttpsExchangeTest, NoFailureRevealsWhatWasSent) {
   Misbehavior garbage;
   garbage.rawAnswer = "hunter2 <envelope>\r\n\r\n";
   Misbehavior brokenHeader;
@@ -431,4 +435,4 @@ TEST_F(HttpsExchangeTest, NoFailureTellsWhatWasSent) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,8 +1,5 @@
 #include "transport/https_session.h"
 
-#include <gmock/gmock.h>
-#include <ssoclient/exceptions.h>
-
 #include <functional>
 #include <future>
 #include <memory>
@@ -11,13 +8,22 @@
 #include <thread>
 #include <type_traits>
 
+#include <gmock/gmock.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/http/connection_spec.h>
+#include <tarnik/http/http_user_agent.h>
+
 #include "support/vtable_slot.h"
 #include "transport/fake_http.h"
 #include "transport/loopback_server.h"
 #include "transport/read_all.h"
 #include "transport/sso_connection_specs.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::Http::ClientResponse;
@@ -46,7 +52,7 @@ class HttpsSessionTest : public testing::Test {
     return {};
   }
 
-  Tarnik::Ref<Testing::FakeUserAgent> agent_ = Tarnik::MakeRef<Testing::FakeUserAgent>();
+  Tarnik::Ref<FakeUserAgent> agent_ = Tarnik::MakeRef<FakeUserAgent>();
   HttpsSession session_{agent_, "/sts", kTimeout};
   SoapRequest request_;
 };
@@ -55,16 +61,16 @@ TEST_F(HttpsSessionTest, HandsBackAReaderOverTheAnswer) {
   Tarnik::Ref<Tarnik::Reader> reader;
   session_.SendRequest(request_, reader);
   ASSERT_NE(reader, nullptr);
-  EXPECT_EQ(Testing::ReadAll(*reader), "answer");
+  EXPECT_EQ(ReadAll(*reader), "answer");
 }
 
 TEST_F(HttpsSessionTest, AFaultIsAnAnswer) {
   agent_->onWait = [] {
-    return Tarnik::MakeRef<Testing::FakeResponse>(500, "Internal Server Error", "<fault/>");
+    return Tarnik::MakeRef<FakeResponse>(500, "Internal Server Error", "<fault/>");
   };
   Tarnik::Ref<Tarnik::Reader> reader;
   session_.SendRequest(request_, reader);
-  EXPECT_EQ(Testing::ReadAll(*reader), "<fault/>");
+  EXPECT_EQ(ReadAll(*reader), "<fault/>");
 }
 
 TEST_F(HttpsSessionTest, TheBlockingWaitHasTheLimitAndSendingHasNone) {
@@ -98,15 +104,13 @@ TEST_F(HttpsSessionTest, AnyPlatformFailureOfTheWaitBecomesACommunicationFailure
 }
 
 TEST_F(HttpsSessionTest, AnErrorStatusIsAFailure) {
-  agent_->onWait = [] {
-    return Tarnik::MakeRef<Testing::FakeResponse>(503, "Service Unavailable");
-  };
+  agent_->onWait = [] { return Tarnik::MakeRef<FakeResponse>(503, "Service Unavailable"); };
   EXPECT_EQ(SendFailure(), "Server returned error: 503 Service Unavailable");
 }
 
 TEST_F(HttpsSessionTest, AnUnreadableResponseIsAFailure) {
   agent_->onWait = [] {
-    auto response = Tarnik::MakeRef<Testing::FakeResponse>(200, "OK");
+    auto response = Tarnik::MakeRef<FakeResponse>(200, "OK");
     response->bodyFailure = "no body";
     return response;
   };
@@ -145,7 +149,7 @@ class HttpsSessionAsyncTest : public HttpsSessionTest {
             message_ = error->Message();
             return;
           }
-          body_ = Testing::ReadAll(*reader);
+          body_ = ReadAll(*reader);
         },
         handle_);
   }
@@ -172,18 +176,18 @@ TEST_F(HttpsSessionAsyncTest, ReturnsTheHandleAtOnceAndGivesTheLimitToTheAgent) 
 
 TEST_F(HttpsSessionAsyncTest, ReportsTheAnswerOnce) {
   Send();
-  Complete(nullptr, Tarnik::MakeRef<Testing::FakeResponse>(200, "OK", "answer").get());
+  Complete(nullptr, Tarnik::MakeRef<FakeResponse>(200, "OK", "answer").get());
   EXPECT_EQ(calls_, 1);
   EXPECT_EQ(body_, "answer");
 }
 
-TEST_F(HttpsSessionAsyncTest, LetsGoOfTheAnswerBehindTheCallback) {
+TEST_F(HttpsSessionAsyncTest, ReleasesTheAnswerAfterTheCallback) {
   long during = 0;
   session_.SendRequestAsync(
       request_,
       [&during](const Tarnik::Exception*, Tarnik::Reader* reader) { during = reader->RefCount(); },
       handle_);
-  const auto response = Tarnik::MakeRef<Testing::FakeResponse>(200, "OK", "answer");
+  const auto response = Tarnik::MakeRef<FakeResponse>(200, "OK", "answer");
   const auto body = response->Body();
   const long before = body->RefCount();
   Complete(nullptr, response.get());
@@ -202,7 +206,7 @@ TEST_F(HttpsSessionAsyncTest, ReportsAPlatformFailure) {
 
 TEST_F(HttpsSessionAsyncTest, ReportsAnErrorStatus) {
   Send();
-  Complete(nullptr, Tarnik::MakeRef<Testing::FakeResponse>(404, "Not Found").get());
+  Complete(nullptr, Tarnik::MakeRef<FakeResponse>(404, "Not Found").get());
   EXPECT_EQ(calls_, 1);
   EXPECT_TRUE(isCommunicationException_);
   EXPECT_EQ(message_, "Server returned error: 404 Not Found");
@@ -210,29 +214,29 @@ TEST_F(HttpsSessionAsyncTest, ReportsAnErrorStatus) {
 
 TEST_F(HttpsSessionAsyncTest, AnEmptyCallbackFailsWhenTheExchangeEnds) {
   session_.SendRequestAsync(request_, nullptr, handle_);
-  const auto response = Tarnik::MakeRef<Testing::FakeResponse>(200, "OK");
+  const auto response = Tarnik::MakeRef<FakeResponse>(200, "OK");
   EXPECT_THROW(agent_->completions[0](nullptr, response.get(), nullptr), std::bad_function_call);
 }
 
-TEST_F(HttpsSessionTest, OperationsStandInTheirOrder) {
+TEST_F(HttpsSessionTest, OperationsKeepTheirSlotOrder) {
   static_assert(!std::has_virtual_destructor_v<TransportSession>);
   const TransportSession& session = session_;
   using Send = void(const void*, const SoapRequest&, Tarnik::Ref<Tarnik::Reader>&);
   Tarnik::Ref<Tarnik::Reader> reader;
-  TestSupport::VtableSlot<Send>(&session, 0)(&session, request_, reader);
+  VtableSlot<Send>(&session, 0)(&session, request_, reader);
   EXPECT_NE(reader, nullptr);
   using SendAsync = void(const void*, const SoapRequest&, const TransportSession::Completion&,
                          Tarnik::Ref<PendingRequestItem>&);
   Tarnik::Ref<PendingRequestItem> handle;
-  TestSupport::VtableSlot<SendAsync>(&session, 1)(&session, request_, nullptr, handle);
+  VtableSlot<SendAsync>(&session, 1)(&session, request_, nullptr, handle);
   EXPECT_EQ(handle, agent_->item);
 }
 
-/// Sends in either way and gives the body of the answer.
+/// Both send a request and return the body of the answer.
 std::string SendNow(const HttpsSession& session, const SoapRequest& request) {
   Tarnik::Ref<Tarnik::Reader> reader;
   session.SendRequest(request, reader);
-  return Testing::ReadAll(*reader);
+  return ReadAll(*reader);
 }
 
 std::string SendLater(const HttpsSession& session, const SoapRequest& request) {
@@ -243,7 +247,7 @@ std::string SendLater(const HttpsSession& session, const SoapRequest& request) {
       [body, caller = std::this_thread::get_id()](const Tarnik::Exception* error,
                                                   Tarnik::Reader* reader) {
         EXPECT_NE(std::this_thread::get_id(), caller);
-        body->set_value(error != nullptr ? error->Message() : Testing::ReadAll(*reader));
+        body->set_value(error != nullptr ? error->Message() : ReadAll(*reader));
       },
       handle);
   EXPECT_NE(handle, nullptr);
@@ -251,7 +255,7 @@ std::string SendLater(const HttpsSession& session, const SoapRequest& request) {
 }
 
 TEST(HttpsSessionWireTest, PostsTheEnvelopeWithTheTwoHeadersInOrder) {
-  const Testing::LoopbackServer server([](const std::string&) { return Testing::OkAnswer("ok"); });
+  const LoopbackServer server([](const std::string&) { return OkAnswer("ok"); });
   Tarnik::Ref<Tarnik::Http::ConnectionSpec> spec;
   CreateSsoConnectionSpec("127.0.0.1", server.Port(), false, spec);
   const HttpsSession session(Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr),
@@ -270,12 +274,12 @@ TEST(HttpsSessionWireTest, PostsTheEnvelopeWithTheTwoHeadersInOrder) {
         received,
         testing::HasSubstr("\r\nContent-Type: text/xml\r\nSOAPAction: "
                            "\"http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue\"\r\n"));
-    EXPECT_EQ(Testing::BodyOf(received), request.body);
+    EXPECT_EQ(BodyOf(received), request.body);
   }
 }
 
 TEST(HttpsSessionWireTest, ASilentServerRunsIntoTheLimit) {
-  const Testing::LoopbackServer server([](const std::string&) { return std::string(); });
+  const LoopbackServer server([](const std::string&) { return std::string(); });
   Tarnik::Ref<Tarnik::Http::ConnectionSpec> spec;
   CreateSsoConnectionSpec("127.0.0.1", server.Port(), false, spec);
   const HttpsSession session(Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr), "/",
@@ -286,4 +290,4 @@ TEST(HttpsSessionWireTest, ASilentServerRunsIntoTheLimit) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

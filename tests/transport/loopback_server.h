@@ -6,6 +6,7 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <cstddef>
 #include <cstring>
 #include <functional>
 #include <mutex>
@@ -17,7 +18,7 @@
 
 namespace SsoClient::Testing {
 
-/// An IPv4 loopback socket on a port of the system's choice.
+/// An IPv4 loopback socket on a port that the system chooses.
 class LoopbackSocket {
  public:
   LoopbackSocket() : fd_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
@@ -43,7 +44,7 @@ class LoopbackSocket {
   int port_ = 0;
 };
 
-/// A listener whose queue is full: a further connect neither succeeds nor fails.
+/// A listener whose queue is full: another connect neither succeeds nor fails.
 class FullListener {
  public:
   FullListener() {
@@ -77,8 +78,8 @@ inline std::string BodyOf(const std::string& message) {
   return message.substr(message.find("\r\n\r\n") + 4);
 }
 
-/// A plain HTTP server on the loopback address that answers each whole request with what `answer`
-/// makes of it, byte for byte.
+/// A plain HTTP server on the loopback address that answers each complete request with exactly the
+/// bytes that `answer` returns.
 class LoopbackServer {
  public:
   using Answer = std::function<std::string(const std::string& request)>;
@@ -154,7 +155,7 @@ class LoopbackServer {
       }
       const std::string answer = answer_(request);
       if (answer.empty()) {
-        continue;  // leave the client waiting
+        continue;  // let the client wait
       }
       ::send(fd, answer.data(), answer.size(), MSG_NOSIGNAL);
     }
@@ -181,7 +182,7 @@ class LoopbackServer {
   std::vector<std::thread> threads_;
 };
 
-/// A 200 answer with `body` and further header lines, each ending in CR LF.
+/// A 200 answer with `body` and more header lines, each ending in CR LF.
 inline std::string OkAnswer(const std::string& body, const std::string& headers = {}) {
   return "HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\n" + headers +
          "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body;

@@ -1,11 +1,14 @@
 #ifndef SSOCLIENT_TESTS_TRANSPORT_SPEC_SLOTS_H
 #define SSOCLIENT_TESTS_TRANSPORT_SPEC_SLOTS_H
 
-#include <gtest/gtest.h>
-
+#include <new>
 #include <string>
+#include <type_traits>
 
+#include <gtest/gtest.h>
+#include <tarnik/core/ref.h>
 #include <tarnik/core/weak_linkable_impl.h>
+#include <tarnik/http/connection_spec.h>
 
 #include "support/vtable_slot.h"
 #include "transport/connect_recorder.h"
@@ -27,49 +30,48 @@ void CheckSpecSlots(const Make& make) {
   const Tarnik::Ref<Spec> spec(make(listener.Port()));
   const void* object = spec.get();
 
-  TestSupport::VtableSlot<VoidFunction>(object, 0)(object);  // IncRef
+  VtableSlot<VoidFunction>(object, 0)(object);  // IncRef
   EXPECT_EQ(spec->RefCount(), 2);
-  TestSupport::VtableSlot<VoidFunction>(object, 1)(object);  // DecRef
+  VtableSlot<VoidFunction>(object, 1)(object);  // DecRef
   EXPECT_EQ(spec->RefCount(), 1);
-  EXPECT_EQ(TestSupport::VtableSlot<TextFunction>(object, 2)(object), spec->ToString());
-  EXPECT_EQ(TestSupport::VtableSlot<long(const void*)>(object, 3)(object), 1);
-  TestSupport::VtableSlot<VoidFunction>(object, 6)(object);  // the two notifications
-  TestSupport::VtableSlot<VoidFunction>(object, 7)(object);
+  EXPECT_EQ(VtableSlot<TextFunction>(object, 2)(object), spec->ToString());
+  EXPECT_EQ(VtableSlot<long(const void*)>(object, 3)(object), 1);
+  VtableSlot<VoidFunction>(object, 6)(object);  // the two notifications
+  VtableSlot<VoidFunction>(object, 7)(object);
   EXPECT_EQ(spec->RefCount(), 1);
 
-  EXPECT_FALSE(TestSupport::VtableSlot<BoolFunction>(object, 9)(object));  // HasLink
+  EXPECT_FALSE(VtableSlot<BoolFunction>(object, 9)(object));  // HasLink
   Tarnik::WeakRef weak;
-  TestSupport::VtableSlot<void(const void*, Tarnik::WeakRef&)>(object, 8)(object, weak);
+  VtableSlot<void(const void*, Tarnik::WeakRef&)>(object, 8)(object, weak);
   EXPECT_EQ(weak.Lock().get(), spec.get());
-  EXPECT_TRUE(TestSupport::VtableSlot<BoolFunction>(object, 9)(object));
+  EXPECT_TRUE(VtableSlot<BoolFunction>(object, 9)(object));
 
   const std::string key = "127.0.0.1:" + std::to_string(listener.Port());
-  EXPECT_EQ(TestSupport::VtableSlot<TextFunction>(object, 10)(object), "127.0.0.1");
-  EXPECT_EQ(TestSupport::VtableSlot<TextFunction>(object, 11)(object), "127.0.0.1");
-  EXPECT_EQ(TestSupport::VtableSlot<TextFunction>(object, 12)(object), key);
-  EXPECT_FALSE(TestSupport::VtableSlot<BoolFunction>(object, 13)(object));
+  EXPECT_EQ(VtableSlot<TextFunction>(object, 10)(object), "127.0.0.1");
+  EXPECT_EQ(VtableSlot<TextFunction>(object, 11)(object), "127.0.0.1");
+  EXPECT_EQ(VtableSlot<TextFunction>(object, 12)(object), key);
+  EXPECT_FALSE(VtableSlot<BoolFunction>(object, 13)(object));
 
   using Completion = Tarnik::Http::CustomConnectionSpec::ConnectCompletion;
   using StartFunction = Tarnik::Ref<Tarnik::System::CancellableItem>(const void*, Completion);
   ConnectRecorder recorder;
-  const auto item =
-      TestSupport::VtableSlot<StartFunction>(object, 14)(object, recorder.Completion());
+  const auto item = VtableSlot<StartFunction>(object, 14)(object, recorder.Completion());
   EXPECT_NE(item, nullptr);
   recorder.Wait();
   EXPECT_EQ(recorder.calls, 1);
   EXPECT_FALSE(recorder.hasError);
   recorder.lastStream->Close();
 
-  // Slot 4 destroys, slot 5 also frees; a sanitizer sees when they do not.
+  // Slot 4 destroys, slot 5 also frees; a sanitizer detects it if they do not.
   const auto* freed = make(1);
   Tarnik::WeakRef freedWeak;
   freed->AttachWeakRef(freedWeak);
-  TestSupport::VtableSlot<VoidFunction>(static_cast<const void*>(freed), 5)(freed);
+  VtableSlot<VoidFunction>(static_cast<const void*>(freed), 5)(freed);
   EXPECT_EQ(freedWeak.Lock(), nullptr);
   const auto* destroyed = make(1);
   Tarnik::WeakRef destroyedWeak;
   destroyed->AttachWeakRef(destroyedWeak);
-  TestSupport::VtableSlot<VoidFunction>(static_cast<const void*>(destroyed), 4)(destroyed);
+  VtableSlot<VoidFunction>(static_cast<const void*>(destroyed), 4)(destroyed);
   EXPECT_EQ(destroyedWeak.Lock(), nullptr);
   ::operator delete(const_cast<void*>(static_cast<const void*>(destroyed)), sizeof(Spec));
 }

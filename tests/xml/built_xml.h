@@ -28,7 +28,7 @@ inline std::string BuiltXml(const XMLBaseBuilder& builder) {
   return XmlText(Built(builder).get());
 }
 
-/// `xml` with every text that has the form of `kTimeForm` replaced by "TIME".
+/// `xml` with "TIME" in place of every text of the form `kTimeForm`.
 inline std::string WithoutTimes(const std::string& xml) {
   constexpr std::string_view kTimeForm = ">dddd-dd-ddTdd:dd:dd.dddZ<";
   const auto matches = [](char pattern, char actual) {

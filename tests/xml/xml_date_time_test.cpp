@@ -1,12 +1,14 @@
 #include "xml/xml_date_time.h"
 
-#include <gmock/gmock.h>
-
+#include <cstdint>
 #include <limits>
+
+#include <gtest/gtest.h>
+#include <tarnik/system/date_time.h>
 
 #include "support/local_zone.h"
 
-namespace SsoClient {
+namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::System::DateTime;
@@ -60,8 +62,8 @@ TEST(XmlDateTimeTest, WrapsTheMicrosecondsBeyond35Minutes) {
   }
 }
 
-TEST(XmlDateTimeTest, TellsTheSumInUtc) {
-  const TestSupport::LocalZone zone;
+TEST(XmlDateTimeTest, GivesTheSumInUtc) {
+  const LocalZone zone;
   EXPECT_EQ(FormatXmlDateTime(AddMinutes(DateTime::Parse("2024-03-05T07:08:09+01:00"), 1)),
             "2024-03-05T06:09:09.000Z");
 }
@@ -72,4 +74,4 @@ TEST(XmlDateTimeTest, StopsAtTheEndOfTime) {
 }
 
 }  // namespace
-}  // namespace SsoClient
+}  // namespace SsoClient::Testing

@@ -1,0 +1,63 @@
+#include "support/qname.h"
+
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+
+#include "support/parse_xml.h"
+#include "support/thrown_message.h"
+
+namespace SsoClient::Testing {
+namespace {
+
+TEST(ResolveQNameTest, FindsThePrefixInScope) {
+  const auto document = ParseXml(R"(<r xmlns:a="urn:outer"><b/></r>)");
+  const auto* element = FindElement(document->RootElement(), "b");
+  EXPECT_EQ(ResolveQName(*element, "a:name", "urn:default"), (QName{"urn:outer", "name"}));
+  EXPECT_EQ(ResolveQName(*element, "xml:lang", ""),
+            (QName{"http://www.w3.org/XML/1998/namespace", "lang"}));
+}
+
+TEST(ResolveQNameTest, PrefersTheInnerBinding) {
+  const auto document = ParseXml(R"(<r xmlns:a="urn:outer"><b xmlns:a="urn:inner"/></r>)");
+  EXPECT_EQ(ResolveQName(*FindElement(document->RootElement(), "b"), "a:name", ""),
+            (QName{"urn:inner", "name"}));
+}
+
+TEST(ResolveQNameTest, GivesTheDefaultToNamesWithoutPrefix) {
+  const auto document = ParseXml(R"(<r xmlns="urn:scope"/>)");
+  EXPECT_EQ(ResolveQName(*document->RootElement(), "b", "urn:default"),
+            (QName{"urn:default", "b"}));
+  EXPECT_EQ(ResolveQName(*document->RootElement(), "b", ""), (QName{"", "b"}));
+  EXPECT_EQ(ResolveQName(*document->RootElement(), "", ""), (QName{"", ""}));
+}
+
+TEST(ResolveQNameTest, SplitsAtTheFirstColon) {
+  const auto document = ParseXml(R"(<r xmlns:a="urn:a"/>)");
+  EXPECT_EQ(ResolveQName(*document->RootElement(), "a:b:c", ""), (QName{"urn:a", "b:c"}));
+  EXPECT_EQ(ResolveQName(*document->RootElement(), "a:", ""), (QName{"urn:a", ""}));
+}
+
+TEST(ResolveQNameTest, LooksUpTheEmptyPrefix) {
+  const auto bound = ParseXml(R"(<r xmlns="urn:scope"/>)");
+  EXPECT_EQ(ResolveQName(*bound->RootElement(), ":b", "urn:default"), (QName{"urn:scope", "b"}));
+  const auto unbound = ParseXml("<r/>");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ResolveQName(*unbound->RootElement(), ":b", ""); }),
+            "Element rat 1,1 uses undefined prefix: `'");
+}
+
+TEST(ResolveQNameTest, RejectsAnUndefinedPrefixWithItsPlace) {
+  const auto document = ParseXml("<r xmlns:p=\"urn:p\">\n  <p:b/></r>");
+  const auto* element = FindElement(document->RootElement(), "b");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ResolveQName(*element, "a:b", "urn:default"); }),
+            "Element p:bat 2,3 uses undefined prefix: `a'");
+}
+
+TEST(ResolveQNameValueTest, UsesTheDefaultNamespaceInScope) {
+  const auto document = ParseXml(R"(<r xmlns="urn:scope"><b xmlns=""/></r>)");
+  EXPECT_EQ(ResolveQNameValue(*document->RootElement(), "t"), (QNameView{"urn:scope", "t"}));
+  EXPECT_EQ(ResolveQNameValue(*FindElement(document->RootElement(), "b"), "t"),
+            (QNameView{"", "t"}));
+}
+
+}  // namespace
+}  // namespace SsoClient::Testing

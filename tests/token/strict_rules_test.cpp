@@ -1,0 +1,272 @@
+#include "token/strict_rules.h"
+
+#include <cstdint>
+#include <locale>
+#include <string>
+#include <utility>
+
+#include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/system/date_time.h>
+
+#include "support/fragment.h"
+#include "support/thrown_message.h"
+
+namespace SsoClient::Testing {
+namespace {
+
+constexpr char kSaml[] = "urn:oasis:names:tc:SAML:2.0:assertion";
+
+TEST(ExpectElementTest, AcceptsNameAndNamespaceUnderAnyPrefix) {
+  for (const char* content : {"<saml2:A/>", R"(<A xmlns="urn:oasis:names:tc:SAML:2.0:assertion"/>)",
+                              R"(<x:A xmlns:x="urn:oasis:names:tc:SAML:2.0:assertion"/>)"}) {
+    const Fragment fragment(content);
+    EXPECT_EQ(&ExpectElement(&fragment.Element(), "A", kSaml), &fragment.Element());
+  }
+}
+
+TEST(ExpectElementTest, RejectsMissingNodeTextAndOtherName) {
+  const std::string expected = "Expected element 'A' not found.";
+  EXPECT_EQ(ThrownMessage<ParseException>([] { ExpectElement(nullptr, "A", kSaml); }), expected);
+  for (const char* content : {"A", "<saml2:B/>", "<saml2:a/>", "<?A?>"}) {
+    const Fragment fragment(content);
+    EXPECT_EQ(ThrownMessage<ParseException>(
+                  [&] { ExpectElement(fragment.Root().FirstChild(), "A", kSaml); }),
+              expected);
+  }
+}
+
+TEST(ExpectElementTest, RejectsOtherNamespaceByTheElementsOwnName) {
+  const Fragment prefixed("<ds:A/>");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ExpectElement(&prefixed.Element(), "A", kSaml); }),
+            "Element 'ds:A' has unexpected namespace");
+  const Fragment plain("<A/>");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ExpectElement(&plain.Element(), "A", kSaml); }),
+            "Element 'A' has unexpected namespace");
+  const Fragment fake(R"(<saml2:A xmlns:saml2="urn:oasis:names:tc:SAML:2.0:assertion "/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ExpectElement(&fake.Element(), "A", kSaml); }),
+            "Element 'saml2:A' has unexpected namespace");
+}
+
+TEST(ExpectEmptyTest, AcceptsWhiteSpaceAndComments) {
+  Fragment fragment("<saml2:A> <!--c-->\n</saml2:A>");
+  EXPECT_NO_THROW(ExpectEmpty(fragment.Cursor().Into(fragment.Element())));
+}
+
+TEST(ExpectEmptyTest, RejectsWhatIsLeft) {
+  for (const char* content :
+       {"<saml2:A><b/></saml2:A>", "<saml2:A>x</saml2:A>", "<saml2:A><?pi?></saml2:A>"}) {
+    Fragment fragment(content);
+    EXPECT_EQ(ThrownMessage<ParseException>(
+                  [&] { ExpectEmpty(fragment.Cursor().Into(fragment.Element())); }),
+              "Element 'saml2:A' must be empty");
+  }
+}
+
+TEST(ReadTextContentTest, GivesTheTextAsItIs) {
+  EXPECT_EQ(ReadTextContent(Fragment("<a>text</a>").Element()), "text");
+  EXPECT_EQ(ReadTextContent(Fragment("<a> \n</a>").Element()), " \n");
+  EXPECT_EQ(ReadTextContent(Fragment("<a>a<![CDATA[<b]]>&amp;c</a>").Element()), "a<b&c");
+}
+
+TEST(ReadTextContentTest, RejectsAnythingButOneText) {
+  for (const char* content : {"<saml2:A/>", "<saml2:A></saml2:A>", "<saml2:A><b/></saml2:A>",
+                              "<saml2:A>x<b/></saml2:A>", "<saml2:A>x<!--c-->y</saml2:A>",
+                              "<saml2:A>x<!--c--></saml2:A>", "<saml2:A><!--c-->x</saml2:A>",
+                              "<saml2:A>x<?pi?>y</saml2:A>", "<saml2:A><!--c--></saml2:A>"}) {
+    const Fragment fragment(content);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadTextContent(fragment.Element()); }),
+              "Element 'saml2:A' must only have textual content (but has extra children or is "
+              "empty).")
+        << content;
+  }
+}
+
+TEST(CheckAttributesTest, AcceptsRequiredOptionalAndNamespaceDeclarations) {
+  const Fragment fragment(R"(<saml2:A c="" b="" a="" xmlns="urn:x" xmlns:y="urn:y"/>)");
+  EXPECT_NO_THROW(CheckAttributes(fragment.Element(), {"a", "b"}, {"c", "d"}));
+}
+
+TEST(CheckAttributesTest, NamesTheFirstMissingOneInListOrder) {
+  const Fragment fragment(R"(<saml2:A b="" extra=""/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] {
+              CheckAttributes(fragment.Element(), {"b", "c", "a"});
+            }),
+            "Node 'saml2:A is missing required attribute 'c'");
+}
+
+TEST(CheckAttributesTest, RejectsWhatIsLeft) {
+  for (const char* content :
+       {R"(<saml2:A a="" b=""/>)", R"(<saml2:A a="" ds:a=""/>)", R"(<saml2:A a="" xmlnsx=""/>)",
+        R"(<saml2:A a="" xml:lang="en"/>)", R"(<saml2:A a="" xsi:type="xs:string"/>)"}) {
+    const Fragment fragment(content);
+    EXPECT_EQ(
+        ThrownMessage<ParseException>([&] { CheckAttributes(fragment.Element(), {"a"}, {"c"}); }),
+        "Unexpected attributes on element 'saml2:A'")
+        << content;
+  }
+}
+
+TEST(CheckAttributesTest, DoesNotTakeAPrefixedAttributeForTheRequiredOne) {
+  const Fragment fragment(R"(<saml2:A saml2:a=""/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CheckAttributes(fragment.Element(), {"a"}); }),
+            "Node 'saml2:A is missing required attribute 'a'");
+}
+
+TEST(CheckEachAttributeTest, FindsTypeUnderAnyPrefix) {
+  const Fragment fragment(
+      R"(<A s:type="x" Count="1" xmlns:s="http://www.w3.org/2001/XMLSchema-instance"/>)");
+  EXPECT_NO_THROW(CheckEachAttribute(fragment.Element(), {kTypeAttribute}, {{"", "Count"}}));
+  EXPECT_EQ(FindTypeAttribute(fragment.Element()), "x");
+}
+
+TEST(CheckEachAttributeTest, NamesTheMissingOne) {
+  const Fragment fragment(R"(<saml2:A type="x" extra=""/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>(
+                [&] { CheckEachAttribute(fragment.Element(), {kTypeAttribute}); }),
+            "Node 'saml2:A is missing required attribute 'xsi:type'");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] {
+              CheckEachAttribute(fragment.Element(), {{"", "Count"}});
+            }),
+            "Node 'saml2:A is missing required attribute 'Count'");
+}
+
+TEST(CheckEachAttributeTest, NamesTheOneTooMany) {
+  const Fragment type(R"(<saml2:A xsi:type="x" type="y"/>)");
+  EXPECT_EQ(
+      ThrownMessage<ParseException>([&] { CheckEachAttribute(type.Element(), {kTypeAttribute}); }),
+      "Unexpected attribute 'type' on element 'saml2:A'");
+  const Fragment nil(R"(<saml2:A xsi:nil="true"/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>(
+                [&] { CheckEachAttribute(nil.Element(), {}, {kTypeAttribute}); }),
+            "Unexpected attribute 'xsi:nil' on element 'saml2:A'");
+  const Fragment foreign(R"(<saml2:A Count="1" saml2:Count="2"/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] {
+              CheckEachAttribute(foreign.Element(), {{"", "Count"}});
+            }),
+            "Unexpected attribute 'saml2:Count' on element 'saml2:A'");
+}
+
+TEST(CheckTypeIsNameableTest, AcceptsNoTypeAndTypesOfBoundPrefixes) {
+  for (const char* content :
+       {"<saml2:A/>", R"(<saml2:A xsi:type="xs:string"/>)", R"(<saml2:A xsi:type="string"/>)",
+        R"(<saml2:A type="no:string"/>)"}) {
+    const Fragment fragment(content);
+    EXPECT_NO_THROW(CheckTypeIsNameable(fragment.Element())) << content;
+  }
+}
+
+TEST(CheckTypeIsNameableTest, RejectsATypeOfAnUnboundPrefix) {
+  const Fragment fragment("\n<saml2:A xsi:type=\"no:string\"/>");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CheckTypeIsNameable(fragment.Element()); }),
+            "Element saml2:Aat 2,1 uses undefined prefix: `no'");
+}
+
+TEST(ReadAttributeTest, GivesTheValueOrNamesTheMissingOne) {
+  const Fragment fragment(R"(<saml2:A a="x &amp; y"/>)");
+  EXPECT_EQ(ReadAttribute(fragment.Element(), "a"), "x & y");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadAttribute(fragment.Element(), "b"); }),
+            "Node 'saml2:A is missing required attribute 'b'");
+}
+
+Fragment WithValue(const std::string& value) {
+  return Fragment("<saml2:A v=\"" + value + "\"/>");
+}
+
+struct DateCase {
+  std::string text;
+  std::string canonical;  // empty: refused
+};
+
+class ReadDateAttributeValueTest : public testing::TestWithParam<DateCase> {};
+
+TEST_P(ReadDateAttributeValueTest, ReadsOrRefuses) {
+  const Fragment fragment = WithValue(GetParam().text);
+  if (!GetParam().canonical.empty()) {
+    const auto time = ReadDateAttribute(fragment.Element(), "v");
+    EXPECT_EQ(Tarnik::System::DateTimeFromUtc(time.GetUtcTime(), false).ToString(),
+              GetParam().canonical);
+    return;
+  }
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadDateAttribute(fragment.Element(), "v"); }),
+            "saml2:A/@v is not a date");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Dates, ReadDateAttributeValueTest,
+    testing::Values(DateCase{"2024-03-05T07:08:09.010Z", "2024-03-05T07:08:09.010Z"},
+                    DateCase{"2024-03-05T07:08:09", "2024-03-05T07:08:09.000Z"},
+                    DateCase{"2024-03-05T24:00:00Z", "2024-03-06T00:00:00.000Z"},
+                    DateCase{"2024-03-05T07:08:09.1234567Z", "2024-03-05T07:08:09.123456Z"},
+                    DateCase{"2024-03-05T14:00:00+14:00", "2024-03-05T00:00:00.000Z"},
+                    DateCase{"2024-02-29T00:00:00Z", "2024-02-29T00:00:00.000Z"},
+                    DateCase{"2024-03-05T23:59:60Z", ""}, DateCase{"2024-03-05T24:00:01Z", ""},
+                    DateCase{"2024-03-05T07:08:09+14:01", ""}, DateCase{"2023-02-29T00:00:00Z", ""},
+                    DateCase{"0000-03-05T07:08:09Z", ""}, DateCase{"-0001-03-05T07:08:09Z", ""},
+                    DateCase{"10000-03-05T07:08:09Z", ""}, DateCase{"2024-03-05T07:08:09z", ""},
+                    DateCase{"2024-03-05t07:08:09Z", ""}, DateCase{" 2024-03-05T07:08:09Z", ""},
+                    DateCase{"2024-03-05T07:08:09Z ", ""}, DateCase{"2024-03-05", ""},
+                    DateCase{"soon", ""}, DateCase{"", ""}));
+
+TEST(ReadDateAttributeTest, NamesAMissingAttribute) {
+  const Fragment fragment = WithValue("x");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadDateAttribute(fragment.Element(), "w"); }),
+            "Node 'saml2:A is missing required attribute 'w'");
+}
+
+TEST(ReadCountAttributeTest, ReadsIntegersThatFit) {
+  const std::pair<const char*, std::uint32_t> cases[] = {
+      {"0", 0},   {"-0", 0},
+      {"+0", 0},  {"+1", 1},
+      {"007", 7}, {"4294967295", 4294967295U},
+      {"10", 10}, {"0000000000000000000000001", 1}};
+  for (const auto& [text, count] : cases) {
+    EXPECT_EQ(ReadCountAttribute(WithValue(text).Element(), "v"), count) << text;
+  }
+}
+
+TEST(ReadCountAttributeTest, RefusesWhatIsNotACount) {
+  for (const char* text : {"-1", "4294967296", "9223372036854775807", "9223372036854775808",
+                           "18446744073709551616", "-9223372036854775809", "1e3", "", " ", " 1",
+                           "1 ", "1.0", "0x10", "one", "+", "-", "+-1", "1,000", "\xD9\xA1"}) {
+    const Fragment fragment = WithValue(text);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadCountAttribute(fragment.Element(), "v"); }),
+              "saml2:A/@v is not a non-negative integer.")
+        << text;
+  }
+}
+
+// Groups digits as many locales do.
+class Grouping : public std::numpunct<char> {
+  char do_thousands_sep() const override { return ','; }
+  std::string do_grouping() const override { return "\3"; }
+};
+
+TEST(ReadCountAttributeTest, DoesNotFollowTheLocale) {
+  const std::locale before = std::locale::global(std::locale(std::locale(), new Grouping));
+  const Fragment fragment = WithValue("1,000");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadCountAttribute(fragment.Element(), "v"); }),
+            "saml2:A/@v is not a non-negative integer.");
+  std::locale::global(before);
+}
+
+TEST(ReadBooleanAttributeTest, ReadsBooleansInAnyLetterCase) {
+  for (const char* text : {"true", "TRUE", "True", "tRuE", "1"}) {
+    EXPECT_TRUE(ReadBooleanAttribute(WithValue(text).Element(), "v")) << text;
+  }
+  for (const char* text : {"false", "FALSE", "False", "0"}) {
+    EXPECT_FALSE(ReadBooleanAttribute(WithValue(text).Element(), "v")) << text;
+  }
+}
+
+TEST(ReadBooleanAttributeTest, RefusesAnythingElse) {
+  for (const char* text : {"yes", "no", "", " true", "true ", "01", "t", "-1"}) {
+    const Fragment fragment = WithValue(text);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadBooleanAttribute(fragment.Element(), "v"); }),
+              "saml2:A/@v is not a Boolean")
+        << text;
+  }
+}
+
+}  // namespace
+}  // namespace SsoClient::Testing
