@@ -35,11 +35,26 @@ function(ssoclient_add_library name)
   endforeach()
   # Hidden headers include those of the private libraries.
   target_link_libraries(${prefix}_static PUBLIC ${LIBRARY_PRIVATE_LIBRARIES})
+  ssoclient_merge_folders(${prefix}_objects "${LIBRARY_SOURCES}")
   ssoclient_link_shared_library(${name} "${LIBRARY_VERSION_SCRIPT}" ${LIBRARY_LINK_OPTIONS})
   ssoclient_bind_calls(${name} ${prefix}_objects)
 
   ssoclient_install_package(NAME ${LIBRARY_PACKAGE} TARGET ${name} HEADERS "${LIBRARY_HEADERS}"
     DESCRIPTION "${LIBRARY_DESCRIPTION}" REQUIRES ${LIBRARY_REQUIRES} DEPENDENCIES ${LIBRARY_DEPENDENCIES})
+endfunction()
+
+# ssoclient_merge_folders(OBJECTS FOLDER): with CMAKE_UNITY_BUILD, compiles the sources of each folder below FOLDER as one
+# translation unit, since most of the time goes into the headers that they share.
+function(ssoclient_merge_folders objects folder)
+  set_target_properties(${objects} PROPERTIES UNITY_BUILD "${CMAKE_UNITY_BUILD}" UNITY_BUILD_MODE GROUP
+    UNITY_BUILD_CODE_BEFORE_INCLUDE "// NOLINTNEXTLINE(bugprone-suspicious-include)")
+  get_target_property(sources ${objects} SOURCES)
+  foreach(source IN LISTS sources)
+    cmake_path(GET source PARENT_PATH group)
+    cmake_path(RELATIVE_PATH group BASE_DIRECTORY "${folder}")
+    string(MAKE_C_IDENTIFIER "folder_${group}" group)
+    set_source_files_properties("${source}" PROPERTIES UNITY_GROUP "${group}")
+  endforeach()
 endfunction()
 
 # ssoclient_link_shared_library(TARGET VERSION_SCRIPT [OPTION...])

@@ -10,7 +10,8 @@ function(ssoclient_configure_target)
       CXX_EXTENSIONS OFF
       CXX_VISIBILITY_PRESET hidden
       VISIBILITY_INLINES_HIDDEN ON
-      POSITION_INDEPENDENT_CODE ON)
+      POSITION_INDEPENDENT_CODE ON
+      UNITY_BUILD OFF)
     if(SSOCLIENT_BUILD_FUZZERS)
       # A fuzzer is guided by the coverage of the code that it calls.
       target_compile_options(${target} PRIVATE -fsanitize=fuzzer-no-link)

@@ -1,6 +1,8 @@
 # Test programs and the way CTest runs them.
 include("${CMAKE_CURRENT_LIST_DIR}/SsoClientTarget.cmake")
 
+add_custom_target(ssoclient_test_programs)
+
 # Compiled once, for every test program.
 file(CONFIGURE OUTPUT "${PROJECT_BINARY_DIR}/ssoclient_test_pch.cpp" CONTENT "")
 add_library(ssoclient_test_pch OBJECT "${PROJECT_BINARY_DIR}/ssoclient_test_pch.cpp")
@@ -60,6 +62,7 @@ function(ssoclient_add_test_program target shards)
   add_executable(${target} ${ARGN})
   ssoclient_configure_test_target(${target})
   target_link_libraries(${target} PRIVATE GTest::gmock_main)
+  add_dependencies(ssoclient_test_programs ${target})
   math(EXPR last "${shards} - 1")
   foreach(index RANGE ${last})
     set(name "${target}.${index}")

@@ -18,25 +18,25 @@ namespace {
 
 constexpr unsigned kFirstAttributeCapacity = 4;
 
-std::string Quoted(std::string_view name) {
+std::string QuotedName(std::string_view name) {
   return "'" + std::string(name) + "'";
 }
 
 void CheckAttribute(const ElementNode& element, std::string_view name, std::string_view value) {
   if (!IsQualifiedName(name)) {
     throw InvalidArgumentException("An attribute name of element " +
-                                   Quoted(element.QualifiedNameText()) +
+                                   QuotedName(element.QualifiedNameText()) +
                                    " is not a qualified name.");
   }
   if (!IsXmlText(value)) {
-    throw InvalidArgumentException("Attribute " + Quoted(name) + " of element " +
-                                   Quoted(element.QualifiedNameText()) +
+    throw InvalidArgumentException("Attribute " + QuotedName(name) + " of element " +
+                                   QuotedName(element.QualifiedNameText()) +
                                    " holds what XML cannot carry: a control character or bytes "
                                    "that are not UTF-8.");
   }
   if (value.size() > std::numeric_limits<unsigned>::max()) {
-    throw InvalidArgumentException("Attribute " + Quoted(name) + " of element " +
-                                   Quoted(element.QualifiedNameText()) + " is too long.");
+    throw InvalidArgumentException("Attribute " + QuotedName(name) + " of element " +
+                                   QuotedName(element.QualifiedNameText()) + " is too long.");
   }
 }
 
