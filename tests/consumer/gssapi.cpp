@@ -6,7 +6,7 @@
 
 namespace {
 
-bool RefusesWhatIsNoService() {
+bool RefusesAnEmptyService() {
   try {
     SsoClient::CreateGssapiNegotiationHandler({});
   } catch (const Tarnik::InvalidArgumentException& e) {
@@ -16,7 +16,7 @@ bool RefusesWhatIsNoService() {
   return false;
 }
 
-bool TellsThatThereAreNoTickets() {
+bool ReportsThatThereAreNoTickets() {
   SsoClient::GssapiNegotiationConfig config;
   config.targetService = "HTTP@sts.example";
   config.credentialCache = "FILE:/nonexistent/cache";
@@ -39,8 +39,8 @@ bool TellsThatThereAreNoTickets() {
 }  // namespace
 
 int main() {
-  if (!RefusesWhatIsNoService() || !TellsThatThereAreNoTickets()) {
-    std::cerr << "The installed Kerberos library does not behave.\n";
+  if (!RefusesAnEmptyService() || !ReportsThatThereAreNoTickets()) {
+    std::cerr << "The installed Kerberos library does not work as expected.\n";
     return 1;
   }
   std::cout << "The installed Kerberos library works.\n";

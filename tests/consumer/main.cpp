@@ -5,7 +5,7 @@
 
 namespace {
 
-bool RefusesWhatIsNoToken() {
+bool RefusesAnotherElement() {
   try {
     SsoClient::CreateSamlToken("<Response/>");
   } catch (const SsoClient::InvalidTokenException& e) {
@@ -14,7 +14,7 @@ bool RefusesWhatIsNoToken() {
   return false;
 }
 
-bool TellsThatNobodyListens() {
+bool ReportsThatNobodyListens() {
   SsoClient::SecurityTokenServiceConfig config;
   config.url = "http://127.0.0.1:1/sts";
   config.tokenFactory = SsoClient::CreateSamlTokenFactory(nullptr);
@@ -32,8 +32,8 @@ bool TellsThatNobodyListens() {
 }  // namespace
 
 int main() {
-  if (!RefusesWhatIsNoToken() || !TellsThatNobodyListens()) {
-    std::cerr << "The installed library does not behave.\n";
+  if (!RefusesAnotherElement() || !ReportsThatNobodyListens()) {
+    std::cerr << "The installed library does not work as expected.\n";
     return 1;
   }
   std::cout << "The installed library works.\n";

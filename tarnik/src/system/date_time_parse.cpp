@@ -8,7 +8,7 @@
 namespace Tarnik::System {
 namespace {
 
-constexpr long kMicrosecondsPerMinute = 60'000'000;
+constexpr long kMinuteInMicroseconds = 60'000'000;
 constexpr int kMaxBiasMinutes = 14 * 60;
 
 [[noreturn]] void Refuse(const char* reason) {
@@ -74,11 +74,11 @@ int ReadFraction(Scanner& scanner) {
   if (!scanner.Skip('.')) {
     return 0;
   }
-  int microseconds = scanner.Digit("digits must follow the decimal point.") * 100'000;
+  int fraction = scanner.Digit("digits must follow the decimal point.") * 100'000;
   for (int unit = 10'000; scanner.IsAtDigit(); unit /= 10) {
-    microseconds += scanner.Digit("digits must follow the decimal point.") * unit;
+    fraction += scanner.Digit("digits must follow the decimal point.") * unit;
   }
-  return microseconds;
+  return fraction;
 }
 
 long ReadTime(Scanner& scanner) {
@@ -124,7 +124,7 @@ DateTime DateTime::Parse(std::string_view text) {
   if (!scanner.IsAtEnd()) {
     Refuse("something follows it.");
   }
-  const long utc = date + time - bias * kMicrosecondsPerMinute;
+  const long utc = date + time - bias * kMinuteInMicroseconds;
   const DateTime result(utc, bias);
   if (result.GetUtcTime() != utc) {
     Refuse("in UTC it lies outside the years 0001 to 9999.");

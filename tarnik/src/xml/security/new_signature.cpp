@@ -48,7 +48,7 @@ const Crypto::PrivateKeyImpl& ImplementationOf(const Crypto::PrivateKey* key) {
   return *implementation;
 }
 
-std::vector<unsigned char> BytesOf(const Digest& digest) {
+std::vector<unsigned char> DigestBytes(const Digest& digest) {
   return {digest.bytes.begin(), digest.bytes.begin() + static_cast<std::ptrdiff_t>(digest.length)};
 }
 
@@ -252,7 +252,7 @@ std::vector<unsigned char> NewSignature::ComputeValues(const Crypto::PrivateKeyI
   DigestWriter writer;
   for (std::size_t i = 0; i < parts_.size(); ++i) {
     std::vector<unsigned char>& value = content.references[i].digestValue;
-    value = BytesOf(ComputeDigest(plan.references[i], writer));
+    value = DigestBytes(ComputeDigest(plan.references[i], writer));
     parts_[i].digestText->SetText(StringUtil::Base64Encode(value));
   }
   const Digest digest = ComputeDigest(plan.signedInfo, writer);

@@ -1,7 +1,12 @@
-# ssoclient_install_package(NAME ... TARGET ... HEADERS ... DESCRIPTION ... [REQUIRES ...]): installs a shared library
-# with its headers, a CMake package and a pkg-config file, as a component with the package's name.
+# ssoclient_install_package(NAME ... TARGET ... HEADERS ... DESCRIPTION ... [REQUIRES ...] [DEPENDENCIES ...]): installs
+# a shared library with its headers, a CMake package and a pkg-config file, as a component with the package's name.
+# REQUIRES names pkg-config packages; each entry of DEPENDENCIES names a CMake package and its version.
 function(ssoclient_install_package)
-  cmake_parse_arguments(PACKAGE "" "NAME;TARGET;HEADERS;DESCRIPTION;REQUIRES" "" ${ARGN})
+  cmake_parse_arguments(PARSE_ARGV 0 PACKAGE "" "NAME;TARGET;HEADERS;DESCRIPTION" "REQUIRES;DEPENDENCIES")
+  if(NOT SSOCLIENT_INSTALL)
+    return()
+  endif()
+  include(CMakePackageConfigHelpers)
   set(cmake_dir "${CMAKE_INSTALL_LIBDIR}/cmake/${PACKAGE_NAME}")
 
   install(TARGETS ${PACKAGE_TARGET} EXPORT ${PACKAGE_NAME}Targets
@@ -11,7 +16,11 @@ function(ssoclient_install_package)
   install(EXPORT ${PACKAGE_NAME}Targets NAMESPACE ${PACKAGE_NAME}:: DESTINATION ${cmake_dir}
     COMPONENT ${PACKAGE_NAME})
 
-  configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/${PACKAGE_NAME}Config.cmake.in"
+  set(PACKAGE_FIND_DEPENDENCIES "")
+  foreach(dependency IN LISTS PACKAGE_DEPENDENCIES)
+    string(APPEND PACKAGE_FIND_DEPENDENCIES "find_dependency(${dependency})\n")
+  endforeach()
+  configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/PackageConfig.cmake.in"
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}Config.cmake" INSTALL_DESTINATION ${cmake_dir})
   write_basic_package_version_file(
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"
@@ -21,9 +30,10 @@ function(ssoclient_install_package)
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"
     DESTINATION ${cmake_dir} COMPONENT ${PACKAGE_NAME})
 
-  # From where the file stands, for the prefix may be chosen when it is installed.
+  # Relative to the pkg-config file, since the prefix may be chosen at installation.
   file(RELATIVE_PATH up "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
   string(REGEX REPLACE "/$" "" up "${up}")
+  list(JOIN PACKAGE_REQUIRES " " PACKAGE_REQUIRES)
   set(PACKAGE_PC_PREFIX "\${pcfiledir}/${up}")
   configure_file("${PROJECT_SOURCE_DIR}/cmake/package.pc.in"
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc" @ONLY)
