@@ -10,9 +10,10 @@ include("${CMAKE_CURRENT_LIST_DIR}/SsoClientTarget.cmake")
 #   NAME_static   the same object files with the include folders of SOURCES, for tests of what the shared library hides
 # with each "-" of NAME replaced by "_" in the latter two. INCLUDES is the folder of the public headers, HEADERS the
 # one below it to install, GENERATED a folder of generated private headers. The libraries are those to link;
-# REQUIRES and DEPENDENCIES are for ssoclient_install_package.
+# REQUIRES and DEPENDENCIES are for ssoclient_install_package. SEPARATE_FOR_TESTS keeps the sources apart in a build with
+# tests, which replace some functions of one source in its calls from another.
 function(ssoclient_add_library name)
-  cmake_parse_arguments(PARSE_ARGV 1 LIBRARY ""
+  cmake_parse_arguments(PARSE_ARGV 1 LIBRARY "SEPARATE_FOR_TESTS"
     "PACKAGE;SOURCES;INCLUDES;HEADERS;VERSION_SCRIPT;DESCRIPTION;GENERATED"
     "DEFINITIONS;LINK_OPTIONS;PUBLIC_LIBRARIES;PRIVATE_LIBRARIES;REQUIRES;DEPENDENCIES")
   string(REPLACE "-" "_" prefix "${name}")
@@ -35,7 +36,9 @@ function(ssoclient_add_library name)
   endforeach()
   # Hidden headers include those of the private libraries.
   target_link_libraries(${prefix}_static PUBLIC ${LIBRARY_PRIVATE_LIBRARIES})
-  ssoclient_merge_folders(${prefix}_objects "${LIBRARY_SOURCES}")
+  if(NOT LIBRARY_SEPARATE_FOR_TESTS OR NOT SSOCLIENT_BUILD_TESTS)
+    ssoclient_merge_folders(${prefix}_objects "${LIBRARY_SOURCES}")
+  endif()
   ssoclient_link_shared_library(${name} "${LIBRARY_VERSION_SCRIPT}" ${LIBRARY_LINK_OPTIONS})
   ssoclient_bind_calls(${name} ${prefix}_objects)
 
