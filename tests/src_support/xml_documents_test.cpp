@@ -1,11 +1,20 @@
 #include "support/xml_documents.h"
 
 #include <gtest/gtest.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/xml/xml_parse_exception.h>
 
 #include "support/parse_xml.h"
 
 namespace SsoClient::Testing {
 namespace {
+
+TEST(XmlDocumentsTest, ParsesATextOrAReader) {
+  EXPECT_EQ(ParseDocument("<a b='1'/>")->RootElement()->FindAttribute("b"), "1");
+  EXPECT_EQ(ParseDocument(Tarnik::CreateStringReader("<c/>").get())->RootElement()->LocalName(),
+            "c");
+  EXPECT_THROW(ParseDocument("<a>"), Tarnik::Xml::XMLParseException);
+}
 
 TEST(XmlDocumentsTest, ElementTextIsTheTextOfAFirstTextChild) {
   const struct {

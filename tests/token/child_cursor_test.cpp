@@ -4,11 +4,14 @@
 #include <string>
 
 #include <gtest/gtest.h>
+#include <ssoclient/exceptions.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/xml/character_nodes.h>
 
 #include "support/fragment.h"
+#include "support/namespaces.h"
 #include "support/parse_xml.h"
+#include "support/thrown_message.h"
 #include "token/strict_rules.h"
 
 namespace SsoClient::Testing {
@@ -78,6 +81,37 @@ TEST(ChildCursorTest, GoesIntoAnElementWithTheSameFilter) {
   const ChildCursor inner = fragment.Cursor().Into(fragment.Element());
   EXPECT_EQ(&inner.Parent(), &fragment.Element());
   EXPECT_TRUE(inner.IsAtElement("b"));
+}
+
+TEST(ChildCursorTest, TakesTheElementItIsAtAndAdvances) {
+  Fragment fragment("<saml2:A/> <!--c--> <saml2:B/>");
+  ChildCursor& cursor = fragment.Cursor();
+  EXPECT_EQ(&cursor.TakeElement("A", kSamlNamespace), &fragment.Element());
+  EXPECT_TRUE(cursor.IsAtElement("B"));
+  EXPECT_EQ(cursor.TakeElement("B", kSamlNamespace).LocalName(), "B");
+  EXPECT_TRUE(cursor.IsAtEnd());
+}
+
+TEST(ChildCursorTest, StaysBeforeAnElementThatItDoesNotTake) {
+  Fragment fragment("<saml2:A/>");
+  ChildCursor& cursor = fragment.Cursor();
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { cursor.TakeElement("B", kSamlNamespace); }),
+            "Expected element 'B' not found.");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { cursor.TakeElement("A", kDsigNamespace); }),
+            "Element 'saml2:A' has unexpected namespace");
+  EXPECT_TRUE(cursor.IsAtElement("A"));
+  cursor.Advance();
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { cursor.TakeElement("A", kSamlNamespace); }),
+            "Expected element 'A' not found.");
+}
+
+TEST(ChildCursorTest, ExpectsItsEnd) {
+  Fragment fragment("<saml2:A/> ");
+  ChildCursor& cursor = fragment.Cursor();
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { cursor.ExpectEnd("There is more"); }),
+            "There is more");
+  cursor.Advance();
+  EXPECT_NO_THROW(cursor.ExpectEnd("There is more"));
 }
 
 // Shows only elements, and counts its calls.
