@@ -15,8 +15,10 @@ using PinnedCertificates = std::vector<Ref<const Crypto::Certificate>>;
 /// Used by one thread at a time; must outlive the connection.
 class PeerCheck {
  public:
-  /// `expected` is a DNS name or an address; `pinned` must outlive this object and may be empty.
-  PeerCheck(const std::string& expected, const PinnedCertificates& pinned);
+  /// Expects the DNS name or address `serverName` or, if that is empty, `host`. `pinned` must
+  /// outlive this object and may be empty.
+  PeerCheck(const std::string& host, const std::string& serverName,
+            const PinnedCertificates& pinned);
 
   /// Makes `ssl` compare the expected name or address with the peer's certificate, and send a name
   /// as SNI.

@@ -36,7 +36,7 @@ TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
     : context_(std::move(context)),
       host_(host),
       sessionPeer_(StringUtil::ToLower(host) + '\n' + StringUtil::ToLower(serverName)),
-      check_(serverName.empty() ? host : serverName, context_->Pinned()),
+      check_(host, serverName, context_->Pinned()),
       ssl_(SSL_new(context_->Get())) {
   const OpenSsl::ErrorScope errors;
   OpenSsl::OwnedBio input(BIO_new(BIO_s_mem()));

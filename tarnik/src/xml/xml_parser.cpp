@@ -1,18 +1,293 @@
 #include <tarnik/xml/xml_parser.h>
 
+#include <expat.h>
+#include <sys/random.h>
+
 #include <algorithm>
+#include <cstddef>
+#include <cstring>
+#include <exception>
+#include <limits>
+#include <memory>
+#include <new>
+#include <string>
+#include <string_view>
+#include <type_traits>
+#include <utility>
+#include <vector>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/text/string_util.h>
+#include <tarnik/xml/xml_parse_exception.h>
 
-#include "xml/expat_session.h"
+#include "xml/expat_memory.h"
 
 namespace Tarnik::Xml {
 
 namespace {
 
+static_assert(sizeof(XML_Char) == 1, "Expat must be built for UTF-8");
+
 // The size of a usual security token. Expat adds 1 KiB and rounds up to a power of two.
 constexpr std::size_t kFirstChunkBytes = std::size_t{7} * 1024;
+
+// Without a salt, Expat would request one from the system for each parser.
+unsigned long HashSalt() noexcept {
+  static const unsigned long salt = [] {
+    unsigned long value = 0;
+    if (getrandom(&value, sizeof(value), 0) != static_cast<ssize_t>(sizeof(value))) {
+      value = 0;  // Expat then generates one
+    }
+    return value;
+  }();
+  return salt;
+}
+
+// Parses one document with Expat: passes its events to a handler and enforces the limits.
+class ExpatSession {
+ public:
+  explicit ExpatSession(XMLHandler& handler);
+
+  // A buffer for the next `size` bytes of the document, valid until `ParseBuffer`.
+  char* Buffer(std::size_t size);
+  // Parses the `size` bytes that were written to the buffer.
+  void ParseBuffer(std::size_t size, bool last);
+
+ private:
+  static constexpr long kUnknown = -1;
+  static constexpr long kNoLineFeed = std::numeric_limits<long>::max();
+
+  struct Deleter {
+    void operator()(XML_Parser parser) const noexcept { XML_ParserFree(parser); }
+  };
+
+  static void OnXmlDeclaration(void* session, const char* version, const char* encoding,
+                               int standalone);
+  static void OnDoctype(void* session, const char* name, const char* systemId, const char* publicId,
+                        int hasInternalSubset);
+  static void OnStartElement(void* session, const char* name, const char** attributes);
+  static void OnEndElement(void* session, const char* name);
+  static void OnCharacters(void* session, const char* text, int length);
+  static void OnStartCDataSection(void* session);
+  static void OnComment(void* session, const char* text);
+  static void OnProcessingInstruction(void* session, const char* target, const char* text);
+
+  // Runs `action` for an event. Exceptions are kept, since they must not pass through Expat.
+  template <class Action>
+  void Handle(Action action) noexcept;
+
+  void CheckFirstBytes(const char* bytes, std::size_t size);
+  // The position of the current event.
+  const Position& Locate();
+  long FindLineFeed(long from, long current) const;
+  void ThrowSyntaxError();
+
+  static XML_Parser CreateParser(ExpatMemory& memory);
+
+  XMLHandler& handler_;
+  ExpatMemory memory_;
+  std::unique_ptr<std::remove_pointer_t<XML_Parser>, Deleter> parser_;
+  const char* buffer_ = nullptr;
+  std::size_t totalBytes_ = 0;
+  std::size_t depth_ = 0;
+  std::vector<ParsedAttribute> attributes_;
+  std::exception_ptr failure_;
+  // Where the event before the current one begins.
+  long locatedByte_ = 0;
+  long lineStartByte_ = 0;
+  // The next line feed of the chunk, cached to avoid a search for each event.
+  long lineFeedByte_ = kUnknown;
+  Position located_{1, 1};
+};
+
+ExpatSession::ExpatSession(XMLHandler& handler)
+    : handler_(handler), parser_(CreateParser(memory_)) {
+  XML_Parser parser = parser_.get();
+  XML_SetHashSalt(parser, HashSalt());
+  XML_SetUserData(parser, this);
+  XML_SetXmlDeclHandler(parser, OnXmlDeclaration);
+  XML_SetStartDoctypeDeclHandler(parser, OnDoctype);
+  XML_SetElementHandler(parser, OnStartElement, OnEndElement);
+  XML_SetCharacterDataHandler(parser, OnCharacters);
+  XML_SetStartCdataSectionHandler(parser, OnStartCDataSection);
+  XML_SetCommentHandler(parser, OnComment);
+  XML_SetProcessingInstructionHandler(parser, OnProcessingInstruction);
+}
+
+XML_Parser ExpatSession::CreateParser(ExpatMemory& memory) {
+  const ExpatMemory::Scope scope(memory);
+  XML_Parser parser = XML_ParserCreate_MM("UTF-8", &ExpatMemory::Suite(), nullptr);
+  if (parser == nullptr) {
+    throw std::bad_alloc();
+  }
+  return parser;
+}
+
+char* ExpatSession::Buffer(std::size_t size) {
+  const ExpatMemory::Scope scope(memory_);
+  auto* buffer = static_cast<char*>(XML_GetBuffer(parser_.get(), static_cast<int>(size)));
+  if (buffer == nullptr) {
+    throw std::bad_alloc();
+  }
+  buffer_ = buffer;
+  return buffer;
+}
+
+void ExpatSession::ParseBuffer(std::size_t size, bool last) {
+  if (totalBytes_ == 0) {
+    CheckFirstBytes(buffer_, size);
+  }
+  totalBytes_ += size;
+  if (totalBytes_ > kMaxDocumentBytes) {
+    throw XMLParseException(
+        "The document is longer than " + std::to_string(kMaxDocumentBytes) + " bytes", located_);
+  }
+  lineFeedByte_ = kUnknown;
+  const ExpatMemory::Scope scope(memory_);
+  const XML_Status status =
+      XML_ParseBuffer(parser_.get(), static_cast<int>(size), last ? XML_TRUE : XML_FALSE);
+  if (failure_ != nullptr) {
+    std::rethrow_exception(failure_);
+  }
+  if (status != XML_STATUS_OK) {
+    ThrowSyntaxError();
+  }
+  if (!last) {
+    // The next chunk removes everything before the incomplete token from the buffer.
+    Locate();
+  }
+}
+
+// Expat switches to UTF-16 at these bytes, whatever encoding it was given.
+void ExpatSession::CheckFirstBytes(const char* bytes, std::size_t size) {
+  if (size < 2) {
+    return;
+  }
+  const std::string_view start(bytes, 2);
+  if (start == "\xFE\xFF" || start == "\xFF\xFE" || start[0] == '\0' || start[1] == '\0') {
+    throw XMLParseException("The document is in UTF-16 or UTF-32; only UTF-8 is accepted",
+                            Position{1, 1});
+  }
+}
+
+// Expat can compute the position itself, but scans each byte again for it.
+const Position& ExpatSession::Locate() {
+  const long byte = XML_GetCurrentByteIndex(parser_.get());
+  if (byte <= locatedByte_) {
+    return located_;
+  }
+  if (lineFeedByte_ == kUnknown) {
+    lineFeedByte_ = FindLineFeed(locatedByte_, byte);
+  }
+  while (lineFeedByte_ < byte) {
+    ++located_.line;
+    lineStartByte_ = lineFeedByte_ + 1;
+    lineFeedByte_ = FindLineFeed(lineStartByte_, byte);
+  }
+  locatedByte_ = byte;
+  located_.column = static_cast<unsigned long>(byte - lineStartByte_) + 1;
+  return located_;
+}
+
+// The first line feed at or after `from` in Expat's buffer; `current` is the byte of the event.
+long ExpatSession::FindLineFeed(long from, long current) const {
+  int offset = 0;
+  int size = 0;
+  const char* buffer = XML_GetInputContext(parser_.get(), &offset, &size);
+  if (buffer == nullptr || current - from > offset) {
+    return kNoLineFeed;
+  }
+  const char* start = buffer + offset - (current - from);
+  const void* found = std::memchr(start, '\n', static_cast<std::size_t>(buffer + size - start));
+  return found == nullptr ? kNoLineFeed : from + (static_cast<const char*>(found) - start);
+}
+
+void ExpatSession::ThrowSyntaxError() {
+  const XML_Error error = XML_GetErrorCode(parser_.get());
+  if (error == XML_ERROR_NO_MEMORY) {
+    throw std::bad_alloc();
+  }
+  throw XMLParseException(XML_ErrorString(error), Locate());
+}
+
+template <class Action>
+void ExpatSession::Handle(Action action) noexcept {
+  // Expat may report a few more events after XML_StopParser.
+  if (failure_ != nullptr) {
+    return;
+  }
+  try {
+    action(Locate());
+  } catch (...) {
+    failure_ = std::current_exception();
+    XML_StopParser(parser_.get(), XML_FALSE);
+  }
+}
+
+void ExpatSession::OnXmlDeclaration(void* session, const char* version, const char* encoding, int) {
+  static_cast<ExpatSession*>(session)->Handle([=](const Position& position) {
+    if (version != nullptr && std::string_view(version) != "1.0") {
+      throw XMLParseException("The document is not XML 1.0", position);
+    }
+    if (encoding != nullptr && StringUtil::ToLower(encoding) != "utf-8") {
+      throw XMLParseException("The document declares an encoding other than UTF-8", position);
+    }
+  });
+}
+
+void ExpatSession::OnDoctype(void* session, const char*, const char*, const char*, int) {
+  static_cast<ExpatSession*>(session)->Handle([](const Position& position) {
+    throw XMLParseException("The document holds a DOCTYPE, which is not accepted", position);
+  });
+}
+
+void ExpatSession::OnStartElement(void* session, const char* name, const char** attributes) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) {
+    if (++self->depth_ > kMaxElementDepth) {
+      throw XMLParseException("Elements nest deeper than " + std::to_string(kMaxElementDepth),
+                              position);
+    }
+    self->attributes_.clear();
+    for (const char** next = attributes; next[0] != nullptr; next += 2) {
+      self->attributes_.push_back({next[0], next[1]});
+    }
+    self->handler_.StartElement(position, name, self->attributes_.data(), self->attributes_.size());
+  });
+}
+
+void ExpatSession::OnEndElement(void* session, const char*) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) {
+    --self->depth_;
+    self->handler_.EndElement(position);
+  });
+}
+
+void ExpatSession::OnCharacters(void* session, const char* text, int length) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) {
+    self->handler_.Characters(position, {text, static_cast<std::size_t>(length)});
+  });
+}
+
+void ExpatSession::OnStartCDataSection(void* session) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) { self->handler_.StartCDataSection(position); });
+}
+
+void ExpatSession::OnComment(void* session, const char* text) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) { self->handler_.Comment(position, text); });
+}
+
+void ExpatSession::OnProcessingInstruction(void* session, const char* target, const char* text) {
+  auto* self = static_cast<ExpatSession*>(session);
+  self->Handle([=](const Position& position) {
+    self->handler_.ProcessingInstruction(position, target, text);
+  });
+}
 
 class XMLParserImpl final : public XMLParser, public ObjectImpl {
  public:

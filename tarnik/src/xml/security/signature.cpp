@@ -55,19 +55,22 @@ bool IsEqual(const Digest& digest, const std::vector<unsigned char>& value) {
                     digest.bytes.begin() + static_cast<std::ptrdiff_t>(digest.length));
 }
 
-// The signature over SignedInfo is verified first, so that the work that the references require is
-// done only for the owner of the key.
-bool IsValid(const SignatureContent& content, const SignaturePlan& plan, const PublicKeyImpl& key) {
-  DigestWriter writer;
-  if (!IsSignatureOf(ComputeDigest(plan.signedInfo, writer), content.signatureValue, key, plan)) {
-    return false;
-  }
+bool AllDigestsMatch(const SignatureContent& content, const SignaturePlan& plan,
+                     DigestWriter& writer) {
   for (std::size_t i = 0; i < plan.references.size(); ++i) {
     if (!IsEqual(ComputeDigest(plan.references[i], writer), content.references[i].digestValue)) {
       return false;
     }
   }
   return true;
+}
+
+// The signature over SignedInfo is verified first, so that the work that the references require is
+// done only for the owner of the key.
+bool IsValid(const SignatureContent& content, const SignaturePlan& plan, const PublicKeyImpl& key) {
+  DigestWriter writer;
+  return IsSignatureOf(ComputeDigest(plan.signedInfo, writer), content.signatureValue, key, plan) &&
+         AllDigestsMatch(content, plan, writer);
 }
 
 [[noreturn]] void RefuseChange() {
