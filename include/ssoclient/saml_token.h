@@ -92,14 +92,14 @@ using KeyInfoResolverSource =
 /// its form is checked, and that it covers the token. `resolver` is used only during the call.
 ///
 /// Throws
-///  - `Tarnik::Xml::XMLParseException` for text that is not well-formed XML or exceeds a limit of
-///  the
-///    parser;
+///  - `Tarnik::Xml::XMLParseException` for text that is not well-formed XML, or that the parser
+///    refuses (see `Tarnik::Xml::XMLParser::Parse`);
 ///  - `ParseException` for a structure or validity fault;
-///  - `InvalidSignatureException` for a signature that does not verify;
+///  - `InvalidSignatureException` for a signature that does not verify, also when `resolver` throws
+///    `Tarnik::Xml::Security::XmlSecurityException`;
 ///  - `Tarnik::Base64FormatException` or `Tarnik::Crypto::CryptoException` for a holder-of-key
 ///    certificate that cannot be decoded;
-///  - any exception of `resolver`.
+///  - any other exception of `resolver`.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml);
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml,
                                                                   long clockToleranceSec);

@@ -20,16 +20,16 @@ namespace SsoClient {
 /// at once from any threads. The order of the operations is part of the binary interface.
 ///
 /// Each operation throws
-///  - before anything is sent, `Tarnik::InvalidArgumentException` for a lifetime that is not
+///  - `Tarnik::InvalidArgumentException`, before anything is sent, for a lifetime that is not
 ///    positive, a text that XML cannot represent, a token that has an id of the signed request
 ///    itself, and what the operation lists;
-///  - before anything is sent, `Tarnik::Xml::XMLParseException` when the text of a token that the
+///  - `Tarnik::Xml::XMLParseException`, before anything is sent, when the text of a token that the
 ///    caller passes is malformed;
-///  - before anything is sent, `Tarnik::InvalidStateException` when the operation needs a
+///  - `Tarnik::InvalidStateException`, before anything is sent, when the operation needs a
 ///    `HolderOfKeyConfig` and there is none, or its certificate is not valid now;
-///  - before anything is sent, `Tarnik::Xml::Security::XmlSecurityException` when the key fails to
-///    sign, and when a token in the signed part of the request declares a namespace with a relative
-///    URI (Canonical XML 1.0, section 1.3);
+///  - `Tarnik::Xml::Security::XmlSecurityException` when the key fails to sign, and when a token in
+///    the signed part of the request, or the issued token, is in the scope of a namespace
+///    declaration with a relative URI (Canonical XML 1.0, section 1.3);
 ///  - `CommunicationException` when the exchange fails or takes longer than 240 seconds;
 ///  - `InvalidCredentialsException` and `PasswordExpiredException` when the service refuses the
 ///    login;
@@ -66,9 +66,9 @@ class SecurityTokenService {
   /// Requests a token by a negotiated login (SPNEGO in WS-Trust 1.3, section 8). `handler` creates
   /// the legs; all are sent in one session with its own cookies, each within 240 seconds. The token
   /// is bound to the key as by `AcquireToken`. Throws `Tarnik::InvalidArgumentException` when the
-  /// handler returns null, and `CommunicationException` when an answer does not identify the
-  /// negotiation or the service asks for more than 1000 legs. Exceptions of the handler propagate
-  /// unchanged.
+  /// handler returns null, also after earlier legs were sent, and `CommunicationException` when an
+  /// answer does not identify the negotiation or the service asks for more than 1000 legs.
+  /// Exceptions of the handler propagate unchanged.
   virtual std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec& spec,
                                                              NegotiationHandler& handler) const = 0;
   /// Requests a holder-of-key token for the owner of the configured certificate (Web Services

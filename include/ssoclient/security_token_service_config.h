@@ -20,8 +20,9 @@ namespace SsoClient {
 struct SecurityTokenServiceConfig {
   /// The service's URL, http or https.
   std::string url;
-  /// The source of the keys that verify tokens where there is no `tokenFactory`. A service ignores
-  /// it: it verifies tokens only through `tokenFactory`.
+  /// The source of the keys that verify the tokens of `InternalApi::CreateGssNegotiationContext`,
+  /// which does not use `tokenFactory`. A service ignores it: it verifies tokens only through
+  /// `tokenFactory`.
   const Tarnik::Xml::Security::KeyInfoResolver* keyInfoResolver = nullptr;
   /// Creates verified tokens from the service's answers; must not be null.
   std::shared_ptr<SamlTokenFactory> tokenFactory;

@@ -2,8 +2,6 @@
 
 #include <memory>
 
-#include <ssoclient/exceptions.h>
-
 #include "support/namespaces.h"
 #include "token/advice_reader.h"
 #include "token/child_cursor.h"

@@ -7,7 +7,6 @@
 
 #include "support/concat.h"
 #include "support/namespaces.h"
-#include "token/strict_rules.h"
 
 namespace SsoClient {
 namespace {

@@ -3,7 +3,6 @@
 
 #include <tarnik/system/date_time.h>
 
-#include "support/clock_tolerance.h"
 #include "token/parsed_assertion.h"
 
 namespace SsoClient {

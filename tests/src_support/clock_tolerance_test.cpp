@@ -10,8 +10,8 @@ namespace {
 
 using Tarnik::System::DateTime;
 
-constexpr long kLargest = std::numeric_limits<long>::max();
-constexpr long kSmallest = std::numeric_limits<long>::min();
+constexpr long kLongest = std::numeric_limits<long>::max();
+constexpr long kShortest = std::numeric_limits<long>::min();
 
 TEST(ClockToleranceTest, AddsSecondsInBothDirections) {
   const DateTime time = DateTime::Parse("2024-03-05T07:08:09.010Z");
@@ -25,12 +25,17 @@ TEST(ClockToleranceTest, ReturnsUtc) {
             DateTime::Parse("2024-03-05T07:08:10Z").ToString());
 }
 
+TEST(ToleranceMicrosecondsTest, StopsAtTheEndsOf64Bits) {
+  EXPECT_EQ(ToleranceMicroseconds(600), 600'000'000);
+  EXPECT_EQ(ToleranceMicroseconds(-1), -1'000'000);
+  EXPECT_EQ(ToleranceMicroseconds(kLongest), kLongest);
+  EXPECT_EQ(ToleranceMicroseconds(kShortest), kShortest);
+}
+
 TEST(ClockToleranceTest, IsLimitedInsteadOfOverflowing) {
   const DateTime time = DateTime::Parse("2024-03-05T07:08:09Z");
-  EXPECT_EQ(ToleranceMicroseconds(kLargest), kLargest);
-  EXPECT_EQ(ToleranceMicroseconds(kSmallest), kSmallest);
-  EXPECT_EQ(AddSeconds(time, kLargest), Tarnik::System::DateTimeFromUtc(kLargest, false));
-  EXPECT_EQ(AddSeconds(time, kSmallest), Tarnik::System::DateTimeFromUtc(kSmallest, false));
+  EXPECT_EQ(AddSeconds(time, kLongest), Tarnik::System::DateTimeFromUtc(kLongest, false));
+  EXPECT_EQ(AddSeconds(time, kShortest), Tarnik::System::DateTimeFromUtc(kShortest, false));
 }
 
 }  // namespace
