@@ -12,7 +12,7 @@
 
 namespace Tarnik::Crypto {
 
-/// An X.509 certificate (RFC 5280). Immutable; safe from many threads.
+/// An X.509 certificate (RFC 5280). Immutable; thread-safe.
 class TARNIK_EXPORT Certificate : public virtual Object {
  public:
   /// The DER encoding and its length in bytes; valid as long as the certificate.

@@ -15,8 +15,8 @@
 namespace Tarnik::Crypto {
 
 /// A private key, which can sign and be used in TLS handshakes but not be read. It may be in memory
-/// or in a device. Immutable; safe from many threads. Created only by the functions below:
-/// functions that use a key accept no other implementation.
+/// or in a device. Immutable; thread-safe. Created only by the functions below: functions that use
+/// a key accept no other implementation.
 class TARNIK_EXPORT PrivateKey : public virtual Object {
  public:
   /// The public half.

@@ -25,16 +25,16 @@ class TARNIK_EXPORT PendingRequestItem : public System::CancellableItem {};
 /// Keeps idle connections for later requests: at most 8 to one endpoint and 64 in total, each for
 /// at most 5 seconds. Several agents may share a pool, but only agents with the same spec object
 /// share connections, since another spec may trust other peers. The pool closes its idle
-/// connections when it is destroyed. Safe from many threads.
+/// connections when it is destroyed. Thread-safe.
 class TARNIK_EXPORT ConnectionPool : public virtual Object {};
 
 TARNIK_EXPORT Ref<ConnectionPool> CreateConnectionPool();
 
-/// Sends HTTP/1.1 requests (RFC 9112) to one endpoint. Safe from many threads. Each exchange under
-/// way has a separate connection, and connections are kept for later exchanges while the agent (or
-/// the pool that it was given) exists. Redirects are not followed, no content coding is requested,
-/// and no request is ever sent twice: when the peer closes an idle connection at the moment of the
-/// next request, that exchange fails (RFC 9110, section 9.2.2).
+/// Sends HTTP/1.1 requests (RFC 9112) to one endpoint. Thread-safe. Each exchange under way has a
+/// separate connection, and connections are kept for later exchanges while the agent (or the pool
+/// that it was given) exists. Redirects are not followed, no content coding is requested, and no
+/// request is ever sent twice: when the peer closes an idle connection at the moment of the next
+/// request, that exchange fails (RFC 9110, section 9.2.2).
 ///
 /// An exchange fails with `HttpException` when the answer violates RFC 9112, is ambiguous, exceeds
 /// a limit, or is cut off; failures of the stream are reported unchanged.

@@ -27,7 +27,7 @@ class TARNIK_EXPORT Stream : public virtual Object {
   /// Writes all `size` bytes.
   virtual void WriteAsync(const char* data, std::size_t size, WriteCompletion completion) = 0;
   /// Closes at once, without notifying the peer. Operations under way complete with a
-  /// `CancelledException`. Safe from any thread, any number of times.
+  /// `CancelledException`. May be called from any thread, any number of times.
   virtual void Close() noexcept = 0;
 };
 

@@ -39,8 +39,8 @@ class TARNIK_EXPORT SignatureReference : public virtual Object {
 /// accepts references, and all functions about its content (`References`, `KeyInfo`, `Verify`)
 /// throw `InvalidStateException`. From then on it behaves like one that was read.
 ///
-/// A signature that was read or signed is immutable and safe from many threads, as long as nobody
-/// modifies the tree; a blank one is used by one thread at a time.
+/// A signature that was read or signed is immutable and thread-safe, as long as nobody modifies the
+/// tree; a blank one is used by one thread at a time.
 class TARNIK_EXPORT Signature : public virtual Object {
  public:
   /// The algorithms' URIs, as written. These and the results of the next accessors are valid as
