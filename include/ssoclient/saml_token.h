@@ -92,9 +92,8 @@ using KeyInfoResolverSource =
 /// its form is checked, and that it covers the token. `resolver` is used only during the call.
 ///
 /// Throws
-///  - `Tarnik::Xml::XMLParseException` for text that is not well-formed XML or exceeds a limit of
-///  the
-///    parser;
+///  - `Tarnik::Xml::XMLParseException` for text that is not well-formed XML or exceeds a limit
+///    of the parser;
 ///  - `ParseException` for a structure or validity fault;
 ///  - `InvalidSignatureException` for a signature that does not verify;
 ///  - `Tarnik::Base64FormatException` or `Tarnik::Crypto::CryptoException` for a holder-of-key

@@ -21,7 +21,7 @@ namespace SsoClient {
 ///
 /// Each operation throws
 ///  - before anything is sent, `Tarnik::InvalidArgumentException` for a lifetime that is not
-///    positive, a text that XML cannot represent, a token that has an id of the signed request
+///    positive, text that XML cannot represent, a token that has an id of the signed request
 ///    itself, and what the operation lists;
 ///  - before anything is sent, `Tarnik::Xml::XMLParseException` when the text of a token that the
 ///    caller passes is malformed;
@@ -35,7 +35,7 @@ namespace SsoClient {
 ///    login;
 ///  - `SsoException` for any other fault, and for an answer of an unexpected form;
 ///  - `InvalidTokenException` (`ParseException`, `InvalidSignatureException`) or another
-///    `Tarnik::Exception` (such as `Tarnik::Xml::XMLParseException`) when the token factory refuses
+///    `Tarnik::Exception` (such as `Tarnik::Xml::XMLParseException`) when the token factory rejects
 ///    the issued token.
 ///
 /// A returned token is null only if the service answers with an empty token text.
@@ -66,9 +66,8 @@ class SecurityTokenService {
   /// Requests a token by a negotiated login (SPNEGO in WS-Trust 1.3, section 8). `handler` creates
   /// the legs; all are sent in one session with its own cookies, each within 240 seconds. The token
   /// is bound to the key as by `AcquireToken`. Throws `Tarnik::InvalidArgumentException` when the
-  /// handler returns null, and `CommunicationException` when an answer does not identify the
-  /// negotiation or the service asks for more than 1000 legs. Exceptions of the handler propagate
-  /// unchanged.
+  /// handler returns null, and `CommunicationException` when an answer has an empty negotiation id
+  /// or the service asks for more than 1000 legs. Exceptions of the handler propagate unchanged.
   virtual std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec& spec,
                                                              NegotiationHandler& handler) const = 0;
   /// Requests a holder-of-key token for the owner of the configured certificate (Web Services
@@ -114,7 +113,7 @@ SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenServic
     const SecurityTokenServiceConfig& config);
 /// Creates a service that sends through the caller's user agent. Throws
 /// `Tarnik::InvalidArgumentException` when the user agent or the token factory is null, and for a
-/// holder-of-key configuration as above. The operations refuse a malformed request target.
+/// holder-of-key configuration as above. The operations reject a malformed request target.
 SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfigEx& config);
 

@@ -21,8 +21,7 @@ namespace SsoClient {
 ///
 /// Each operation assigns `request` only on success, and throws
 ///  - `Tarnik::InvalidArgumentException` when a lifetime is not positive, when XML cannot represent
-///  a
-///    text (the message names the element, never the text), and when a token has an id of the
+///    a text (the message names the element, never the text), and when a token has an id of the
 ///    signed request itself;
 ///  - `Tarnik::InvalidStateException` when a key is needed and there is none, and when the
 ///    certificate of the key is not valid now;
