@@ -19,7 +19,7 @@ inline constexpr std::size_t kMaxHeaderBytes = std::size_t{64} * 1024;
 inline constexpr std::size_t kMaxBodyBytes = std::size_t{16} * 1024 * 1024;
 
 /// An exchange under way. `Cancel` closes its connection, and the completion then receives a
-/// `CancelledException`. `Cancel` returns false when the exchange had ended before.
+/// `CancelledException`. `Cancel` returns false when the exchange had already ended.
 class TARNIK_EXPORT PendingRequestItem : public System::CancellableItem {};
 
 /// Keeps idle connections for later requests: at most 8 to one endpoint and 64 in total, each for
@@ -49,8 +49,9 @@ class TARNIK_EXPORT UserAgent : public virtual Object {
   /// measured from the call to the last byte of the answer.
   ///
   /// Throws `InvalidArgumentException` for a null request, an empty completion or a spec whose host
-  /// is neither a name nor an address, `InvalidStateException` for a request that was sent before,
-  /// and whatever the spec throws when it cannot begin to connect. The completion then never runs.
+  /// is neither a name nor an address, `InvalidStateException` for a request that has already been
+  /// sent, and whatever the spec throws when it cannot begin to connect. The completion then never
+  /// runs.
   virtual Ref<PendingRequestItem> SendAsync(ClientRequest* request, Completion completion,
                                             unsigned long timeoutMicroseconds) = 0;
 

@@ -47,7 +47,7 @@ struct SSLContextConfig {
   /// Trust the CAs of the operating system.
   bool useSystemStore = false;
   /// PEM files of certificate revocation lists. If there is any, every certificate of a peer's
-  /// chain is checked, and a certificate whose issuer's list is missing or out of date is refused.
+  /// chain is checked, and a certificate whose issuer's list is missing or out of date is rejected.
   std::vector<std::string> crlFiles;
   /// If not empty, the peer's certificate must also equal one of these byte for byte.
   std::vector<Ref<const Crypto::Certificate>> pinnedCertificates;

@@ -12,7 +12,7 @@ namespace Tarnik::System {
 /// of the zone of its calendar fields. An immutable value; comparisons use only the instant.
 ///
 /// The range is 0001-01-01T00:00:00.000000Z to 9999-12-31T23:59:59.999999Z, the years that XML
-/// Schema dateTime writes in four digits; instants outside of it are set to its nearest end.
+/// Schema dateTime writes in four digits; instants outside of it are clamped to it.
 class TARNIK_EXPORT DateTime {
  public:
   /// 1970-01-01T00:00:00Z.

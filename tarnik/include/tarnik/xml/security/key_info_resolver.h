@@ -31,7 +31,7 @@ TARNIK_EXPORT Ref<const KeyInfoResolver> CreateTrustedCertificatesResolver(
 
 /// As above, but the certificate is selected by the issuer that the KeyInfo names: the
 /// X509IssuerSerial, or else the issuer and serial number of the first certificate in the KeyInfo.
-/// A signature that names no issuer is refused.
+/// A signature that names no issuer is rejected.
 TARNIK_EXPORT Ref<const KeyInfoResolver> CreateCertificateIssuerResolver(
     std::vector<Ref<const Crypto::Certificate>> certificates);
 
