@@ -17,7 +17,7 @@
 namespace SsoClient {
 
 /// A client of one WS-Trust 1.3 Security Token Service. Immutable; any number of operations may run
-/// at once from any threads. The order of the operations is part of the binary interface.
+/// concurrently, on any threads. The order of the operations is part of the binary interface.
 ///
 /// Each operation throws
 ///  - before anything is sent, `Tarnik::InvalidArgumentException` for a lifetime that is not

@@ -48,10 +48,10 @@ struct GssapiNegotiationConfig {
 ///   empty, or if another thread is in the same call.
 ///
 /// It blocks while the Kerberos library sends requests to the realm, to which the timeouts of the
-/// service do not apply: MIT Kerberos 1.20 gives up at once if the KDC is not running, and after 27
-/// seconds if it does not answer (after 40 with two such KDCs, after 66 with four). A handler must
-/// be used by one thread at a time, not necessarily the one that created it; different handlers are
-/// independent. Tickets are never delegated to the service.
+/// service do not apply: MIT Kerberos 1.20 gives up immediately if the KDC is not running, and
+/// after 27 seconds if it does not answer (after 40 with two such KDCs, after 66 with four). A
+/// handler must be used by one thread at a time, not necessarily the one that created it; different
+/// handlers are independent. Tickets are never delegated to the service.
 class GssapiNegotiationHandler : public NegotiationHandler {
  public:
   /// Whether the most recent negotiation is complete and the service has proved its identity. A

@@ -15,7 +15,7 @@
 namespace Tarnik::Http {
 
 /// A stream that serves one exchange after the other. While it is idle a read stays under way on
-/// it, so that a close by the peer, or unexpected bytes, are noticed at once; the next exchange
+/// it, so that a close by the peer, or unexpected bytes, are noticed immediately; the next exchange
 /// takes that read over. Thread-safe.
 class Connection final : public ObjectImpl {
  public:

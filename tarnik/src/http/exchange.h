@@ -21,8 +21,8 @@ namespace Tarnik::Http {
 /// One request and its answer: connects or takes an idle connection, writes, reads, and ends once,
 /// with whatever comes first: the answer, a failure, its time limit or `Cancel`.
 ///
-/// The read starts together with the write, so that a close or an early answer is noticed at once.
-/// The completions of operations under way keep alive what these operations use.
+/// The read starts together with the write, so that a close or an early answer is noticed
+/// immediately. The completions of operations under way keep alive what these operations use.
 class Exchange final : public PendingRequestItem, public ObjectImpl {
  public:
   /// What an exchange is made from.

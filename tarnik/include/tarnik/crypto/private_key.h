@@ -46,7 +46,7 @@ using PassphraseCallback = std::function<std::string()>;
 /// kind.
 TARNIK_EXPORT Ref<const PrivateKey> CreatePrivateKeyFromPem(
     std::string_view pem, const PassphraseCallback& passphrase = {});
-/// Reads a PEM file. Throws `IOException` when it cannot be read, else as above.
+/// Reads a PEM file. Throws `IOException` when it cannot be read, and otherwise as above.
 TARNIK_EXPORT Ref<const PrivateKey> LoadPrivateKey(const std::string& path,
                                                    const PassphraseCallback& passphrase = {});
 /// Loads the only private key that `uri` names, through OpenSSL's store: "file:" (RFC 8089), or
@@ -71,7 +71,7 @@ struct KeyAndCertificate {
 /// bytes cannot be decoded or are protected with an algorithm that is not available.
 TARNIK_EXPORT KeyAndCertificate CreateKeyAndCertificateFromPkcs12(
     const unsigned char* bytes, std::size_t length, const PassphraseCallback& passphrase = {});
-/// Reads a PKCS#12 file. Throws `IOException` when it cannot be read, else as above.
+/// Reads a PKCS#12 file. Throws `IOException` when it cannot be read, and otherwise as above.
 TARNIK_EXPORT KeyAndCertificate LoadKeyAndCertificate(const std::string& path,
                                                       const PassphraseCallback& passphrase = {});
 

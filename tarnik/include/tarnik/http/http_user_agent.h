@@ -42,11 +42,11 @@ class TARNIK_EXPORT UserAgent : public virtual Object {
  public:
   using Completion = std::function<void(Exception*, ClientResponse*, PendingRequestItem*)>;
 
-  /// Sends `request` and returns at once. The completion runs exactly once, on an I/O thread, with
-  /// exactly one of exception and response; both are valid only during the call. It must not block,
-  /// and an exception that leaves it ends the process, as on any thread. When `timeoutMicroseconds`
-  /// is not 0 and that time passes first, the exchange ends with a `TimeoutException`; the time is
-  /// measured from the call to the last byte of the answer.
+  /// Sends `request` and returns immediately. The completion runs exactly once, on an I/O thread,
+  /// with exactly one of exception and response; both are valid only during the call. It must not
+  /// block, and an exception that leaves it ends the process, as on any thread. When
+  /// `timeoutMicroseconds` is not 0 and that time passes first, the exchange ends with a
+  /// `TimeoutException`; the time is measured from the call to the last byte of the answer.
   ///
   /// Throws `InvalidArgumentException` for a null request, an empty completion or a spec whose host
   /// is neither a name nor an address, `InvalidStateException` for a request that has already been
