@@ -1,5 +1,5 @@
 // Acquires a token by Kerberos with one call per leg. This is for servers that relay the legs
-// between the service and a client that makes them.
+// between the service and a client that creates them.
 #include <ssoclient/gssapi_negotiation_handler.h>
 #include <ssoclient/ssoclient.h>
 

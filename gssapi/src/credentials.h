@@ -34,7 +34,7 @@ void CheckKeytab(const std::string& keytab, const std::string& principal);
 /// The object identifier of SPNEGO (RFC 4178, section 3).
 gss_OID SpnegoMechanism() noexcept;
 
-/// Where credentials come from. The library chooses what is empty.
+/// Where credentials come from. The library chooses a default for each empty field.
 struct CredentialSource {
   std::string principal;
   std::string keytab;

@@ -8,7 +8,7 @@
 
 namespace SsoClient {
 
-/// A text of the libraries in a form that is safe in a message: one line of UTF-8, with question
+/// Text of the libraries in a form that is safe in a message: one line of UTF-8, with question
 /// marks in place of control characters and invalid bytes, without the trailing blanks and NULs
 /// that some texts have, and truncated after at most 500 bytes. Parts of such a text may come from
 /// a service, a KDC or a credential cache.

@@ -24,7 +24,8 @@ using Leg = std::vector<unsigned char>;
 // Integrity lets SPNEGO protect the choice of the mechanism (RFC 4178, section 5).
 constexpr OM_uint32 kFlags = GSS_C_MUTUAL_FLAG | GSS_C_INTEG_FLAG;
 
-// Kerberos takes at most three. A service that never ends would block its caller forever.
+// Kerberos takes at most three legs. A service that never ends the negotiation would block its
+// caller forever.
 constexpr int kMaxLegs = 100;
 
 // Only one thread at a time may work on a negotiation.

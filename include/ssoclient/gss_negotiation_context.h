@@ -24,20 +24,20 @@ struct GssNegotiationResult {
 /// time; different contexts are independent.
 class GssNegotiationContext {
  public:
-  /// Sends `inputLeg` and waits for the answer, at most 40 seconds. When the answer does not
-  /// identify the negotiation, the next call starts a new one.
+  /// Sends `inputLeg` and waits for the answer, at most 40 seconds. When the answer has an empty
+  /// negotiation id, the next call starts a new negotiation.
   ///
-  /// Throws as `SecurityTokenService::AcquireToken` does. The state is then as before, unless the
-  /// answer could be read: its id of the negotiation is kept.
+  /// Throws as `SecurityTokenService::AcquireToken` does. The state is then unchanged, except that
+  /// the negotiation id of an answer that could be read is kept.
   virtual GssNegotiationResult Negotiate(const std::vector<unsigned char>& inputLeg) = 0;
 
  protected:
   ~GssNegotiationContext() = default;
 };
 
-/// Creates a context that requests a token by `spec`. It uses the `url`, `sslContext`,
-/// `sslPeerName`, `holderOfKeyConfig` and `keyInfoResolver` of `config`. The resolver verifies the
-/// token; if it is null, the token's signature is NOT verified. Throws
+/// Creates a context that requests the token that `spec` describes. It uses the `url`,
+/// `sslContext`, `sslPeerName`, `holderOfKeyConfig` and `keyInfoResolver` of `config`. The resolver
+/// verifies the token; if it is null, the token's signature is NOT verified. Throws
 /// `Tarnik::InvalidArgumentException` as `CreateSecurityTokenService` does for these fields.
 SSOCLIENT_EXPORT std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(
     const SecurityTokenServiceConfig& config, const TokenSpec& spec);

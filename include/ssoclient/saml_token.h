@@ -85,7 +85,7 @@ using KeyInfoResolverSource =
     std::function<Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver>(const SamlToken*)>;
 
 /// Reads one SAML 2.0 assertion strictly, validates it against the system clock, and verifies its
-/// signature if a resolver is given. Never returns null. Safe from many threads.
+/// signature if a resolver is given. Never returns null. Thread-safe.
 ///
 /// `clockToleranceSec`, in seconds, widens the validity period at both ends; a negative value
 /// narrows it. The default is 600. A null `resolver` means that the signature is NOT verified: only
@@ -93,7 +93,7 @@ using KeyInfoResolverSource =
 ///
 /// Throws
 ///  - `Tarnik::Xml::XMLParseException` for text that is not well-formed XML, or that the parser
-///    refuses (see `Tarnik::Xml::XMLParser::Parse`);
+///    rejects (see `Tarnik::Xml::XMLParser::Parse`);
 ///  - `ParseException` for a structure or validity fault;
 ///  - `InvalidSignatureException` for a signature that does not verify, also when `resolver` throws
 ///    `Tarnik::Xml::Security::XmlSecurityException`;

@@ -9,8 +9,8 @@
 namespace SsoClient {
 
 /// Creates tokens for code that does not know the keys. Owned by a `std::shared_ptr` to the
-/// concrete class. Implementations must be safe to use from many threads. The order of the
-/// operations is part of the binary interface.
+/// concrete class. Implementations must be thread-safe. The order of the operations is part of the
+/// binary interface.
 class SamlTokenFactory {
  public:
   /// Does what the function `CreateSamlToken` does and throws what it throws. The default tolerance

@@ -17,7 +17,7 @@
 namespace SsoClient {
 
 /// A client of one WS-Trust 1.3 Security Token Service. Immutable; any number of operations may run
-/// at once from any threads. The order of the operations is part of the binary interface.
+/// concurrently, on any threads. The order of the operations is part of the binary interface.
 ///
 /// Each operation throws
 ///  - `Tarnik::InvalidArgumentException`, before anything is sent, for a lifetime that is not
@@ -35,7 +35,7 @@ namespace SsoClient {
 ///    login;
 ///  - `SsoException` for any other fault, and for an answer of an unexpected form;
 ///  - `InvalidTokenException` (`ParseException`, `InvalidSignatureException`) or another
-///    `Tarnik::Exception` (such as `Tarnik::Xml::XMLParseException`) when the token factory refuses
+///    `Tarnik::Exception` (such as `Tarnik::Xml::XMLParseException`) when the token factory rejects
 ///    the issued token.
 ///
 /// A returned token is null only if the service answers with an empty token text.
@@ -67,7 +67,7 @@ class SecurityTokenService {
   /// the legs; all are sent in one session with its own cookies, each within 240 seconds. The token
   /// is bound to the key as by `AcquireToken`. Throws `Tarnik::InvalidArgumentException` when the
   /// handler returns null, also after earlier legs were sent, and `CommunicationException` when an
-  /// answer does not identify the negotiation or the service asks for more than 1000 legs.
+  /// answer has an empty negotiation id or the service asks for more than 1000 legs.
   /// Exceptions of the handler propagate unchanged.
   virtual std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec& spec,
                                                              NegotiationHandler& handler) const = 0;
@@ -114,7 +114,7 @@ SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenServic
     const SecurityTokenServiceConfig& config);
 /// Creates a service that sends through the caller's user agent. Throws
 /// `Tarnik::InvalidArgumentException` when the user agent or the token factory is null, and for a
-/// holder-of-key configuration as above. The operations refuse a malformed request target.
+/// holder-of-key configuration as above. The operations reject a malformed request target.
 SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfigEx& config);
 

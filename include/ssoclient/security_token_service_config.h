@@ -28,8 +28,8 @@ struct SecurityTokenServiceConfig {
   std::shared_ptr<SamlTokenFactory> tokenFactory;
   /// The name that the service's TLS certificate must have; the URL's host if empty.
   std::string sslPeerName;
-  /// The key for holder-of-key tokens. Without it all tokens are bearer tokens, and the operations
-  /// by certificate, by token and to renew are refused.
+  /// The key for holder-of-key tokens. Without it all tokens are bearer tokens, and
+  /// `AcquireTokenByCertificate`, `AcquireTokenByToken` and `RenewToken` throw.
   boost::optional<HolderOfKeyConfig> holderOfKeyConfig;
   /// The TLS trust and settings; may be null for an http URL.
   Tarnik::Ssl::SSLContext* sslContext = nullptr;

@@ -9,7 +9,7 @@
 namespace SsoClient {
 
 /// Validates what a service is to sign with, so that a mistake is found before the security token
-/// service refuses a request. Throws `Tarnik::InvalidArgumentException` when a part is null, the
+/// service rejects a request. Throws `Tarnik::InvalidArgumentException` when a part is null, the
 /// certificate's key cannot be read, the private key does not belong to the certificate, or it
 /// cannot sign RSA-SHA256. Accepts an absent configuration.
 void CheckHolderOfKeyConfig(const boost::optional<HolderOfKeyConfig>& config);

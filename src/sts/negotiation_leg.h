@@ -20,7 +20,8 @@ struct NegotiationParts {
 };
 
 /// Sends one leg of a negotiation and returns the answer. With an empty `contextId` the leg opens a
-/// negotiation for a token by `spec`; otherwise it continues the negotiation with that id.
+/// negotiation for the token that `spec` describes; otherwise it continues the negotiation with
+/// that id.
 NegotiationResponse SendNegotiationLeg(const NegotiationParts& parts, const TokenSpec& spec,
                                        const std::string& contextId,
                                        const std::vector<unsigned char>& leg);

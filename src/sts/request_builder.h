@@ -17,7 +17,7 @@
 
 namespace SsoClient {
 
-/// Builds the requests of a service's operations. Safe from many threads.
+/// Builds the requests of a service's operations. Thread-safe.
 ///
 /// Each operation assigns `request` only on success, and throws
 ///  - `Tarnik::InvalidArgumentException` when a lifetime is not positive, when XML cannot represent

@@ -41,7 +41,7 @@ class ResponseHandler {
   ~ResponseHandler() = default;
 };
 
-/// Stateless; safe from many threads.
+/// Stateless; thread-safe.
 class ResponseHandlerImpl final : public ResponseHandler {
  public:
   void ParseIssueResponse(Tarnik::Reader* response, std::string& assertion) const override;

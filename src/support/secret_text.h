@@ -10,7 +10,7 @@
 
 namespace SsoClient {
 
-/// A text that is cleansed from memory when it is destroyed: a password, a token, a request.
+/// Text that is cleansed from memory when it is destroyed: a password, a token, a request.
 struct SecretText {
   std::string text;
 

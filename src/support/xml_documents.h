@@ -30,7 +30,7 @@ const Tarnik::Xml::ElementNode* FindDescendant(const Tarnik::Xml::ElementNode& e
                                                std::initializer_list<std::string_view> path);
 
 /// Returns the element in Canonical XML 1.0, so with the namespace declarations that it inherits.
-/// Returns an empty text when `element` is null.
+/// Returns an empty string when `element` is null.
 std::string CanonicalizeElement(const Tarnik::Xml::ElementNode* element);
 
 }  // namespace SsoClient

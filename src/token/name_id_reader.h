@@ -14,7 +14,7 @@ namespace SsoClient {
 /// the last at sign. Throws `ParseException` for another format or an empty or missing part.
 PrincipalId PrincipalFromNameId(std::string_view format, std::string_view value);
 
-/// The group of a text "domain\group", which is split at the first backslash. Throws
+/// The group of the text "domain\group", which is split at the first backslash. Throws
 /// `ParseException` for an empty or missing part.
 PrincipalId PrincipalFromGroupIdentity(std::string_view value);
 

@@ -17,7 +17,7 @@ AuthnStatement ReadAuthnStatement(ChildCursor& cursor);
 /// checked for their form. Throws `ParseException`.
 SubjectAttributes ReadAttributeStatement(ChildCursor& cursor);
 
-/// One SAML Attribute (SAML 2.0 core, section 2.7.3.1). The texts are in the tree.
+/// One SAML Attribute (SAML 2.0 core, section 2.7.3.1). The views point into the tree.
 struct AttributeView {
   std::string_view name;
   std::string_view nameFormat;    ///< empty when absent
@@ -28,7 +28,7 @@ struct AttributeView {
 /// How an AttributeValue without content is handled.
 enum class EmptyValues {
   kRefused,
-  kRead,  ///< as an empty text
+  kRead,  ///< as an empty string
 };
 
 /// Reads an Attribute and its AttributeValue children, each of which has only text. Throws

@@ -47,7 +47,7 @@ class TransportSession {
   ~TransportSession() = default;
 };
 
-/// Creates sessions; safe from many threads. Owned like a session.
+/// Creates sessions. Thread-safe. Owned like a session.
 class Transport {
  public:
   virtual std::shared_ptr<TransportSession> CreateSession() const = 0;

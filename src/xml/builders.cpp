@@ -41,7 +41,7 @@ void TextElementBuilderImpl::Build(Ref<ElementNode>& out) const {
   CreateElementWithAttributes(prefix_, localName_, attributes_, out);
   Ref<Tarnik::Xml::TextNode> text;
   Tarnik::Xml::CreateTextNode(text);
-  // Appended before its text is set: a refused text is reported with the name of its parent.
+  // Appended before its text is set: rejected text is reported with the name of its parent.
   out->AppendChild(text.get());
   text->SetText(text_.text);
 }

@@ -54,7 +54,7 @@ std::shared_ptr<XMLSignedSoapBuilder> MakeSignedSoapBuilderForCertificate(
 
 /// Throws `Tarnik::InvalidArgumentException` when a token in the request has the id of the
 /// request's own certificate or signature: a service that finds two elements with one id would
-/// refuse the request, or use the wrong element. `envelope` already contains its certificate, if
+/// reject the request, or use the wrong element. `envelope` already contains its certificate, if
 /// there is one, but not its signature.
 void RejectReservedIds(const Tarnik::Xml::ElementNode& envelope);
 

@@ -45,7 +45,7 @@ inline constexpr WsTrustNames kWsTrust13 = {
     .invalidStatus = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid",
 };
 
-/// The namespace of wst14:ActAs (WS-Trust 1.4, section 9.3), which requests use beside
+/// The namespace of wst14:ActAs (WS-Trust 1.4, section 9.3), which requests use in addition to
 /// WS-Trust 1.3.
 inline constexpr char kWst14Namespace[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200802";
 

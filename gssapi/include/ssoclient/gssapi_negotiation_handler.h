@@ -19,7 +19,7 @@ struct GssapiNegotiationConfig {
   /// The Kerberos principal that logs in, such as "machine" or "machine@EXAMPLE.COM". If empty: the
   /// owner of the credential cache, or the first principal of the keytab.
   std::string principal;
-  /// The keytab with whose keys tickets are acquired. If empty, the credential cache must contain
+  /// The keytab whose keys are used to acquire tickets. If empty, the credential cache must contain
   /// tickets.
   std::string keytab;
   /// The credential cache, such as "FILE:/run/app/tickets". If empty: the default cache without a
@@ -27,30 +27,31 @@ struct GssapiNegotiationConfig {
   std::string credentialCache;
 };
 
-/// Makes the legs of a negotiated login, Kerberos (RFC 4121) inside SPNEGO (RFC 4178), with the
+/// Creates the legs of a negotiated login, Kerberos (RFC 4121) inside SPNEGO (RFC 4178), with the
 /// system's GSSAPI library. It can be used with `SecurityTokenService::AcquireTokenByGSS` as well
 /// as for the legs of a `GssNegotiationContext`, and for any number of negotiations in sequence.
 ///
 /// `Negotiate` begins a negotiation whenever the service's leg is empty and forgets the previous
 /// one, finished or not. It looks up the credentials at that time, so that it finds renewed
-/// tickets. It returns an empty leg, never null, when the client has nothing left to send: the
-/// service's last leg has proved that the service is the one that the tickets are for, or the
-/// service continues after that. (`AcquireTokenByGSS` passes on a last leg after its loop and logs
-/// a line about the empty answer to it, which is harmless.)
+/// tickets. It returns an empty leg, never null, when the client has nothing left to send: when the
+/// service's last leg has proved that the service is the one that the tickets are for, and when the
+/// service sends further legs after that proof. (`AcquireTokenByGSS` passes the last leg to the
+/// handler after its loop and logs a line about the empty leg that the handler returns, which is
+/// harmless.)
 ///
 /// `Negotiate` throws
 /// - `SsoException`, with the texts of the GSSAPI library, if there are no credentials, if the
-///   realm does not answer or refuses, if the service's leg is malformed or does not prove its
-///   identity, and also if the service asks for more than 100 legs; the negotiation is then
-///   forgotten;
+///   realm does not answer or rejects the request, if the service's leg is malformed or does not
+///   prove its identity, and also if the service asks for more than 100 legs; the negotiation is
+///   then forgotten;
 /// - `Tarnik::InvalidStateException` if no negotiation is in progress and the service's leg is not
 ///   empty, or if another thread is in the same call.
 ///
-/// It blocks while the Kerberos library sends requests to the realm, to which the time-outs of the
-/// service do not apply: MIT Kerberos 1.20 gives up at once if the KDC is not running, and after 27
-/// seconds if it does not answer (after 40 with two such KDCs, after 66 with four). A handler must
-/// be used by one thread at a time, not necessarily the one that created it; different handlers are
-/// independent. Tickets are never delegated to the service.
+/// It blocks while the Kerberos library sends requests to the realm, to which the timeouts of the
+/// service do not apply: MIT Kerberos 1.20 gives up immediately if the KDC is not running, and
+/// after 27 seconds if it does not answer (after 40 with two such KDCs, after 66 with four). A
+/// handler must be used by one thread at a time, not necessarily the one that created it; different
+/// handlers are independent. Tickets are never delegated to the service.
 class GssapiNegotiationHandler : public NegotiationHandler {
  public:
   /// Whether the most recent negotiation is complete and the service has proved its identity. A

@@ -17,7 +17,7 @@ constexpr std::size_t HashLength(Hash hash) noexcept {
 }
 inline constexpr std::size_t kMaxHashLength = 64;
 
-/// OpenSSL's implementation of the hash. It is fetched once per process, since OpenSSL's look-up by
+/// OpenSSL's implementation of the hash. It is fetched once per process, since OpenSSL's lookup by
 /// name costs more than hashing a few hundred bytes. Throws `CryptoException` when OpenSSL does not
 /// provide it.
 const EVP_MD* FetchedHash(Hash hash);

@@ -13,7 +13,7 @@ namespace Tarnik::Crypto {
 enum class KeyOperation : unsigned char { kVerify, kSign };
 
 /// Idle OpenSSL contexts that were set up for one operation with one key. They are reused, since
-/// setting one up makes OpenSSL look up algorithms by name. Safe from many threads.
+/// setting one up makes OpenSSL look up algorithms by name. Thread-safe.
 class KeyContextPool {
  public:
   explicit KeyContextPool(KeyOperation operation) noexcept : operation_(operation) {}

@@ -11,7 +11,7 @@ namespace {
 // PEM_BUFSIZE of OpenSSL, the size of its callbacks' buffer.
 constexpr std::size_t kMaxPassphraseBytes = 1024;
 
-/// The text that the callback returned, cleansed also when it is refused.
+/// The text that the callback returned, cleansed also when it is rejected.
 struct CallbackResult {
   std::string text;
   ~CallbackResult() { StringUtil::Cleanse(text); }

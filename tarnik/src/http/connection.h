@@ -15,8 +15,8 @@
 namespace Tarnik::Http {
 
 /// A stream that serves one exchange after the other. While it is idle a read stays under way on
-/// it, so that a close by the peer, or unexpected bytes, are noticed at once; the next exchange
-/// takes that read over. Safe from many threads.
+/// it, so that a close by the peer, or unexpected bytes, are noticed immediately; the next exchange
+/// takes that read over. Thread-safe.
 class Connection final : public ObjectImpl {
  public:
   /// Empty bytes without an error mean the orderly end of the connection. Both arguments are valid

@@ -21,8 +21,8 @@ namespace Tarnik::Http {
 /// One request and its answer: connects or takes an idle connection, writes, reads, and ends once,
 /// with whatever comes first: the answer, a failure, its time limit or `Cancel`.
 ///
-/// The read starts together with the write, so that a close or an early answer is noticed at once.
-/// The completions of operations under way keep alive what these operations use.
+/// The read starts together with the write, so that a close or an early answer is noticed
+/// immediately. The completions of operations under way keep alive what these operations use.
 class Exchange final : public PendingRequestItem, public ObjectImpl {
  public:
   /// What an exchange is made from.
@@ -82,11 +82,11 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   bool HasEnded();
   /// Ends with a copy of `failure` and runs the completion. Called on an I/O thread.
   void Fail(const Exception& failure);
-  /// The same on any thread, but the completion runs later. False when the exchange had ended
-  /// before.
+  /// The same on any thread, but the completion runs later. False when the exchange had already
+  /// ended.
   bool FailLater(const Exception& failure);
-  /// Sets the outcome and returns the operations under way; nothing when there is an outcome
-  /// already.
+  /// Sets the outcome and returns the operations under way; nothing when there already is an
+  /// outcome.
   std::optional<PendingWork> Settle(Outcome outcome);
   /// Stops the operations under way and closes the connection, or keeps it if `mayReuse`.
   void Release(const PendingWork& work, bool mayReuse) const;

@@ -55,7 +55,7 @@ bool TakeScheme(std::string_view& url) {
 }
 
 // RFC 3986, section 3.2.2: only an IPv6 address may be in brackets. A zone (RFC 6874) is meaningful
-// only on this machine, so it is refused too.
+// only on this machine, so it is rejected too.
 std::string_view TakeBracketedHost(std::string_view& authority) {
   const auto end = authority.find(']');
   if (end == std::string_view::npos) {

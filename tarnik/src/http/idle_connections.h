@@ -32,7 +32,7 @@ struct Endpoint {
   }
 };
 
-/// Connections that are currently not in use. The destructor closes them. Safe from many threads.
+/// Connections that are currently not in use. The destructor closes them. Thread-safe.
 class IdleConnections final : public std::enable_shared_from_this<IdleConnections> {
  public:
   IdleConnections() = default;

@@ -36,7 +36,7 @@ void CheckStatusLine(std::string_view line) {
 }
 
 void CheckLength(std::string_view value, Framing& framing) {
-  // RFC 9112, section 6.3. A repetition of the same number is refused too.
+  // RFC 9112, section 6.3. A repetition of the same number is rejected too.
   if (framing.hasLength) {
     throw ResponseFault{"gives its Content-Length more than once"};
   }

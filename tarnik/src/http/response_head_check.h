@@ -12,7 +12,7 @@ struct ResponseFault {
   std::string_view text;
 };
 
-/// Finds the end of a response head as its bytes arrive, and refuses bytes that are not allowed in
+/// Finds the end of a response head as its bytes arrive, and rejects bytes that are not allowed in
 /// a head. RFC 9112 lets recipients repair many of these violations, but each repair lets two
 /// readers interpret one answer differently, so nothing is repaired here.
 class ResponseHeadScanner {

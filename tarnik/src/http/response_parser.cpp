@@ -170,8 +170,8 @@ bool ResponseParser::ReadBody() {
   return !error;
 }
 
-// Chunk extensions and trailers are ignored, and a chunk may hold a single byte. Without this limit
-// an answer could go on for ever without reaching the limit of its body.
+// Chunk extensions and trailers are ignored, and a chunk may contain a single byte. Without this
+// limit an answer could continue forever without reaching the limit of its body.
 void ResponseParser::CheckOverhead() const {
   constexpr std::size_t kFramingPerBodyByte = 8;
   const std::size_t body = message_->body.Size();

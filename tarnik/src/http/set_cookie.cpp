@@ -35,7 +35,7 @@ NameAndValue TakePair(std::string_view& header) {
   return {TrimBlanks(pair.substr(0, equals)), TrimBlanks(pair.substr(equals + 1)), true};
 }
 
-/// RFC 6265, section 5.2.2: zero or less expires at once. Nothing when `text` is not a number.
+/// RFC 6265, section 5.2.2: zero or less expires immediately. Nothing when `text` is not a number.
 std::optional<long> ParseMaxAge(std::string_view text) {
   const bool isNegative = !text.empty() && text.front() == '-';
   if (isNegative) {

@@ -11,7 +11,7 @@ namespace Tarnik::Ssl {
 
 using PinnedCertificates = std::vector<Ref<const Crypto::Certificate>>;
 
-/// Checks that the peer of one connection is the expected one, and describes why it was refused.
+/// Checks that the peer of one connection is the expected one, and describes why it was rejected.
 /// Used by one thread at a time; must outlive the connection.
 class PeerCheck {
  public:
@@ -28,7 +28,7 @@ class PeerCheck {
   /// when the peer is not the expected one.
   bool IsAccepted(const SSL* ssl);
 
-  /// Why the peer was refused; empty if it was not.
+  /// Why the peer was rejected; empty if it was not.
   const std::string& Failure() const noexcept { return failure_; }
 
   /// Called for each step of a verification with OpenSSL's result; returns the final result.

@@ -12,7 +12,7 @@
 namespace Tarnik::Ssl {
 
 /// TLS sessions for resumption, stored by peer. The number of sessions is limited; the oldest is
-/// removed first. Safe from any thread.
+/// removed first. Thread-safe.
 class SessionCache {
  public:
   using Clock = std::chrono::steady_clock;

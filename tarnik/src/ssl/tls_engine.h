@@ -34,7 +34,7 @@ class TlsEngine {
 
   void Feed(const char* data, std::size_t size);
   std::size_t OutputSize() const;
-  /// Moves all pending output out.
+  /// Moves out all pending output.
   std::vector<char> TakeOutput();
 
   /// Throws the failure of the handshake or, after it, of a connection that was cut off without

@@ -9,7 +9,7 @@
 
 namespace Tarnik {
 
-/// Bytes that may hold passwords, keys or tokens. No copy stays in memory when the text is
+/// Bytes that may contain passwords, keys or tokens. No copy stays in memory when the text is
 /// destroyed or outgrows its buffer.
 class SensitiveText {
  public:

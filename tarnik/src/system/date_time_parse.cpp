@@ -15,7 +15,7 @@ constexpr int kMaxBiasMinutes = 14 * 60;
   throw DateTimeFormatException(std::string("Not a date and time: ") + reason);
 }
 
-// Reads a text from front to back; unexpected characters are errors.
+// Reads text from front to back; unexpected characters are errors.
 class Scanner {
  public:
   explicit Scanner(std::string_view text) : rest_(text) {}

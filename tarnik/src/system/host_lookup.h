@@ -14,7 +14,7 @@ struct SocketAddress {
   socklen_t length;
 };
 
-/// The result of a look-up: addresses in the order in which to try them, or the reason for their
+/// The result of a lookup: addresses in the order in which to try them, or the reason for their
 /// absence.
 struct HostAddresses {
   std::vector<SocketAddress> addresses;

@@ -21,7 +21,7 @@ using boost::system::error_code;
 // The socket is called with the mutex held; completions run without it. An operation that has
 // started on the socket is ended by its own handler, since the caller's buffer is in use until
 // then; the handler checks `closed_` first. `Close` itself ends only a connect that still waits for
-// its look-up.
+// its lookup.
 class TCPClientSocketImpl final : public TCPClientSocket, public ObjectImpl {
  public:
   explicit TCPClientSocketImpl(ThreadPoolImpl& pool)

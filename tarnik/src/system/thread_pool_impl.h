@@ -31,9 +31,9 @@ class ThreadPoolImpl final : public ThreadPool, public ObjectImpl {
 
   boost::asio::io_context& IoContext() noexcept { return *ioContext_; }
 
-  /// Runs `lookup`, which may block but must not wait for other work of the pool. Name look-ups
-  /// have separate threads, so that work items which occupy all workers and wait for connections
-  /// cannot prevent these connections from being made.
+  /// Runs `lookup`, which may block but must not wait for other work of the pool. Name lookups have
+  /// separate threads, so that work items which occupy all workers and wait for connections cannot
+  /// prevent these connections from being made.
   void RunLookup(std::function<void()> lookup);
 
   /// Stops everything for process exit, as `ThreadPool` describes.

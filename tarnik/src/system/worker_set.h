@@ -11,7 +11,7 @@
 namespace Tarnik::System {
 
 /// Threads that run items which may block. A thread is added while all are busy, up to a maximum;
-/// further items queue in order. Threads that are idle for `idleLimit` end. Safe from any thread.
+/// further items queue in order. Threads that are idle for `idleLimit` end. Thread-safe.
 ///
 /// A set that lives as long as the process must be leaked, since its detached threads use it.
 class WorkerSet {

@@ -172,7 +172,7 @@ void DocumentHandler::Comment(const Position& position, std::string_view text) {
 void DocumentHandler::ProcessingInstruction(const Position& position, std::string_view target,
                                             std::string_view text) {
   Current();
-  // Namespaces in XML 1.0, section 7: no processing instruction target holds a colon.
+  // Namespaces in XML 1.0, section 7: no processing instruction target contains a colon.
   if (target.find(':') != std::string_view::npos) {
     throw XMLParseException(
         "The processing instruction target " + QuoteVerbatim(target) + " holds a colon", position);
@@ -238,7 +238,7 @@ std::string_view DocumentHandler::Resolve(std::string_view prefix, const Positio
 }
 
 // Namespaces in XML 1.0, section 6.3. Only attributes with a prefix are compared: those without one
-// are in no namespace, and the parser itself refuses duplicates of them.
+// are in no namespace, and the parser itself rejects duplicates of them.
 void DocumentHandler::CheckAttributeNames(const ElementNode& element, const Position& position) {
   expandedNames_.clear();
   for (std::size_t index = 0; index < element.AttributeCount(); ++index) {

@@ -1,5 +1,5 @@
 #!/bin/sh
-# Creates the files in signatures/ again with new keys. Needs openssl and xmlsec1.
+# Recreates the files in signatures/ with new keys. Needs openssl and xmlsec1.
 set -eu
 
 here=$(cd "$(dirname "$0")" && pwd)
@@ -54,7 +54,7 @@ assertion() {
     "$subject</saml:Assertion>"
 }
 
-# sign KEY FILE: signs the standard input with xmlsec1 and lets it verify the result.
+# sign KEY FILE: signs the standard input with xmlsec1 and verifies the result with it.
 sign() {
   cat > "$work/template.xml"
   xmlsec1 --sign --privkey-pem "$work/$1.key,$out/$1.pem" \
@@ -65,7 +65,7 @@ sign() {
     { cat "$work/log" >&2; exit 1; }
 }
 
-# alter FILE EXPRESSION: writes valid.xml, edited by sed.
+# alter FILE EXPRESSION: writes valid.xml to FILE, edited by sed with EXPRESSION.
 alter() {
   sed "$2" "$out/valid.xml" > "$out/$1"
   if cmp -s "$out/valid.xml" "$out/$1"; then

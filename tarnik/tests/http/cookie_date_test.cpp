@@ -9,7 +9,7 @@ using namespace Tarnik::Http;
 
 struct CookieDateCase {
   const char* text;
-  const char* expected;  // empty for a refusal
+  const char* expected;  // empty if rejected
 };
 
 class CookieDateTest : public testing::TestWithParam<CookieDateCase> {};

@@ -35,7 +35,7 @@ inline Ref<Http::ClientRequest> PostRequest(const std::string& body = "<a/>",
   return request;
 }
 
-/// Waits until `condition` holds; returns false if it does not within the tests' patience.
+/// Waits until `condition` holds; returns false if it does not within `kPatience`.
 template <class Condition>
 bool Eventually(Condition condition) {
   const auto end = std::chrono::steady_clock::now() + kPatience;

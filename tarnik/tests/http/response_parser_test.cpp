@@ -28,7 +28,8 @@ void FeedInPieces(ResponseParser& parser, std::string_view bytes, std::size_t pi
   }
 }
 
-/// The message that refuses `bytes` followed by the end of the connection; empty if accepted.
+/// The message with which `bytes`, followed by the end of the connection, are rejected; empty if
+/// they are accepted.
 std::string RefusalOf(const std::string& bytes, std::size_t pieceSize) {
   ResponseParser parser(kPeer);
   return ThrownMessage<HttpException>(

@@ -16,7 +16,7 @@ struct OracleRequest {
   std::optional<int> element;
 };
 
-/// The canonical form of `xml` by libxml2, or none if libxml2 refuses it.
+/// The canonical form of `xml` by libxml2, or none if libxml2 rejects it.
 std::optional<std::string> CanonicalizeWithLibXml2(const std::string& xml,
                                                    const OracleRequest& request);
 

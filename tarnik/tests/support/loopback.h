@@ -45,7 +45,7 @@ bool HasIpv6Loopback();
 bool SendAll(int socket, const std::string& data);
 /// Blocks for `size` bytes; returns fewer only at the end of the stream or after a reset.
 std::string ReceiveExactly(int socket, std::size_t size);
-/// Makes the next close of `socket` reset the connection instead of ending it in order.
+/// Makes the next close of `socket` reset the connection instead of closing it gracefully.
 void ResetOnClose(int socket);
 /// The loopback port of a socket that is bound but does not listen, so that connecting to it is
 /// refused. `holder` owns the socket.

@@ -15,8 +15,8 @@
 namespace Tarnik::Testing {
 
 /// A stream whose other end is a TLS server in memory, which sends `greeting` after the handshake
-/// and closes in order. What it sends can be cut off after any number of bytes and arrives in
-/// pieces of a chosen size.
+/// and then closes gracefully. What it sends can be cut off after any number of bytes and arrives
+/// in pieces of a chosen size.
 class MemoryTlsPeer final : public System::Stream, public ObjectImpl {
  public:
   enum class AtCut { kEnd, kReset, kSilence };

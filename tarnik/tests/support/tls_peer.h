@@ -41,8 +41,8 @@ class TlsServer {
   };
   using Handler = std::function<void(SSL*)>;
 
-  /// `serve` runs after each successful handshake; if empty, the server sends "hello" and closes in
-  /// order.
+  /// `serve` runs after each successful handshake; if empty, the server sends "hello" and closes
+  /// gracefully.
   TlsServer(const TlsPeerOptions& options, int connections, Handler serve = {});
   ~TlsServer() { Join(); }
   TlsServer(const TlsServer&) = delete;

@@ -210,7 +210,7 @@ INSTANTIATE_TEST_SUITE_P(
                   "4"}),
     [](const auto& test) { return test.param.name; });
 
-// Each would be refused if one of the rules above were too strict.
+// Each would be rejected if one of the rules above were too strict.
 TEST(DocumentHandlerTest, AcceptsWhatNamespacesAllow) {
   for (const char* text :
        {"<a xmlns:p='urn:1' xmlns:q='urn:2' p:x='1' q:x='2' x='3'/>",

@@ -16,7 +16,7 @@ inline std::string Fault(const std::string& text) {
   return ThrownMessage<Xml::XMLParseException>([&text] { ParseXml(text); }, "");
 }
 
-/// A text that the parser refuses, and the message of its exception.
+/// Text that the parser rejects, and the message of its exception.
 struct FaultCase {
   const char* name;
   std::string text;

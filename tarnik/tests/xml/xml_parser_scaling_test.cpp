@@ -25,7 +25,7 @@ double SecondsToParse(const std::string& text, std::size_t piece) {
     try {
       ParseXml(reader.get());
     } catch (const XMLParseException&) {
-      // A refusal must not take long either.
+      // A rejection must not take long either.
     }
     best = std::min(best, static_cast<double>(std::clock() - start) / CLOCKS_PER_SEC);
   }

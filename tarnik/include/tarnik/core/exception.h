@@ -48,7 +48,7 @@ class TARNIK_EXPORT TypeMismatchException : public Exception {
   [[noreturn]] void Throw() const override;
 };
 
-/// A text that is not a date and time.
+/// Text that is not a date and time.
 class TARNIK_EXPORT DateTimeFormatException : public Exception {
  public:
   explicit DateTimeFormatException(std::string message,
@@ -58,7 +58,7 @@ class TARNIK_EXPORT DateTimeFormatException : public Exception {
   [[noreturn]] void Throw() const override;
 };
 
-/// A text that is not Base64.
+/// Text that is not Base64.
 class TARNIK_EXPORT Base64FormatException : public Exception {
  public:
   explicit Base64FormatException(std::string message,

@@ -12,7 +12,7 @@
 
 namespace Tarnik::Crypto {
 
-/// An X.509 certificate (RFC 5280). Immutable; safe from many threads.
+/// An X.509 certificate (RFC 5280). Immutable; thread-safe.
 class TARNIK_EXPORT Certificate : public virtual Object {
  public:
   /// The DER encoding and its length in bytes; valid as long as the certificate.
@@ -39,7 +39,8 @@ TARNIK_EXPORT Ref<const Certificate> CreateCertificateFromDer(const unsigned cha
 /// Reads every CERTIFICATE block of a PEM text (RFC 7468), in order. Throws `CryptoException` when
 /// there is none or one cannot be decoded.
 TARNIK_EXPORT std::vector<Ref<const Certificate>> CreateCertificatesFromPem(std::string_view pem);
-/// Reads a file of PEM certificates. Throws `IOException` when it cannot be read, else as above.
+/// Reads a file of PEM certificates. Throws `IOException` when it cannot be read, and otherwise as
+/// above.
 TARNIK_EXPORT std::vector<Ref<const Certificate>> LoadCertificates(const std::string& path);
 
 }  // namespace Tarnik::Crypto

@@ -15,8 +15,8 @@
 namespace Tarnik::Crypto {
 
 /// A private key, which can sign and be used in TLS handshakes but not be read. It may be in memory
-/// or in a device. Immutable; safe from many threads. Created only by the functions below:
-/// functions that use a key accept no other implementation.
+/// or in a device. Immutable; thread-safe. Created only by the functions below: functions that use
+/// a key accept no other implementation.
 class TARNIK_EXPORT PrivateKey : public virtual Object {
  public:
   /// The public half.
@@ -46,13 +46,13 @@ using PassphraseCallback = std::function<std::string()>;
 /// kind.
 TARNIK_EXPORT Ref<const PrivateKey> CreatePrivateKeyFromPem(
     std::string_view pem, const PassphraseCallback& passphrase = {});
-/// Reads a PEM file. Throws `IOException` when it cannot be read, else as above.
+/// Reads a PEM file. Throws `IOException` when it cannot be read, and otherwise as above.
 TARNIK_EXPORT Ref<const PrivateKey> LoadPrivateKey(const std::string& path,
                                                    const PassphraseCallback& passphrase = {});
-/// Loads the only private key that `uri` names with OpenSSL's store: "file:" (RFC 8089), or another
-/// scheme that a provider loaded into this process supports, such as "pkcs11:" (RFC 7512). A key in
-/// a device stays there. Throws `CryptoException` when the URI has no scheme or an unsupported one,
-/// and as above.
+/// Loads the only private key that `uri` names, through OpenSSL's store: "file:" (RFC 8089), or
+/// another scheme that a provider loaded into this process supports, such as "pkcs11:" (RFC 7512).
+/// A key in a device stays there. Throws `CryptoException` when the URI has no scheme or an
+/// unsupported one, and as above.
 TARNIK_EXPORT Ref<const PrivateKey> LoadPrivateKeyFromUri(
     const std::string& uri, const PassphraseCallback& passphrase = {});
 
@@ -71,7 +71,7 @@ struct KeyAndCertificate {
 /// bytes cannot be decoded or are protected with an algorithm that is not available.
 TARNIK_EXPORT KeyAndCertificate CreateKeyAndCertificateFromPkcs12(
     const unsigned char* bytes, std::size_t length, const PassphraseCallback& passphrase = {});
-/// Reads a PKCS#12 file. Throws `IOException` when it cannot be read, else as above.
+/// Reads a PKCS#12 file. Throws `IOException` when it cannot be read, and otherwise as above.
 TARNIK_EXPORT KeyAndCertificate LoadKeyAndCertificate(const std::string& path,
                                                       const PassphraseCallback& passphrase = {});
 

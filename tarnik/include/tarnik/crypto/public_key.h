@@ -8,7 +8,7 @@ namespace Tarnik::Crypto {
 
 enum class KeyAlgorithm { kRsa, kRsaPss, kEc, kOther };
 
-/// A public key. Immutable; safe from many threads. Returned by `Certificate::GetPublicKey` and
+/// A public key. Immutable; thread-safe. Returned by `Certificate::GetPublicKey` and
 /// `PrivateKey::GetPublicKey`.
 class TARNIK_EXPORT PublicKey : public virtual Object {
  public:

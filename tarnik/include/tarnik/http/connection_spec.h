@@ -11,7 +11,7 @@
 
 namespace Tarnik::Http {
 
-/// Defines where and how a user agent connects. Immutable; safe from many threads.
+/// Defines where and how a user agent connects. Immutable; thread-safe.
 class TARNIK_EXPORT ConnectionSpec : public virtual Object {};
 
 /// A connection spec that opens its streams itself. The order of the virtual functions is part of

@@ -10,8 +10,8 @@
 
 namespace Tarnik::Http {
 
-/// Cookies in memory (RFC 6265). Safe from many threads. Stores at most 50 cookies per domain and
-/// 300 in total, of at most 4096 bytes each; the oldest are removed first.
+/// Cookies in memory (RFC 6265). Thread-safe. Stores at most 50 cookies per domain and 300 in
+/// total, of at most 4096 bytes each; the oldest are removed first.
 class TARNIK_EXPORT CookieStore : public virtual Object {
  public:
   /// Stores the cookie of a Set-Cookie header that `host` sent in the answer to a request for

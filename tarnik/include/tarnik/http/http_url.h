@@ -12,7 +12,7 @@ namespace Tarnik::Http {
 /// IPv4 address, or an IPv6 address without its brackets; `port` is the port of the URL, or 80 or
 /// 443 if it has none; `path` is the request target: path and query, "/" if the URL has no path.
 ///
-/// Throws `InvalidArgumentException`, whose message contains the fault but not the URL, for another
+/// Throws `InvalidArgumentException`, whose message states the fault but not the URL, for another
 /// scheme, a missing or malformed host (including a name that a resolver would read as a number), a
 /// port outside 1 to 65535, user information, a fragment, blanks, control characters or non-ASCII
 /// bytes, characters that must be percent-encoded, and malformed percent escapes; the outputs are

@@ -19,22 +19,22 @@ inline constexpr std::size_t kMaxHeaderBytes = std::size_t{64} * 1024;
 inline constexpr std::size_t kMaxBodyBytes = std::size_t{16} * 1024 * 1024;
 
 /// An exchange under way. `Cancel` closes its connection, and the completion then receives a
-/// `CancelledException`. `Cancel` returns false when the exchange had ended before.
+/// `CancelledException`. `Cancel` returns false when the exchange had already ended.
 class TARNIK_EXPORT PendingRequestItem : public System::CancellableItem {};
 
 /// Keeps idle connections for later requests: at most 8 to one endpoint and 64 in total, each for
 /// at most 5 seconds. Several agents may share a pool, but only agents with the same spec object
 /// share connections, since another spec may trust other peers. The pool closes its idle
-/// connections when it is destroyed. Safe from many threads.
+/// connections when it is destroyed. Thread-safe.
 class TARNIK_EXPORT ConnectionPool : public virtual Object {};
 
 TARNIK_EXPORT Ref<ConnectionPool> CreateConnectionPool();
 
-/// Sends HTTP/1.1 requests (RFC 9112) to one endpoint. Safe from many threads. Each exchange under
-/// way has a separate connection, and connections are kept for later exchanges while the agent (or
-/// the pool that it was given) exists. Redirects are not followed, no content coding is requested,
-/// and no request is ever sent twice: when the peer closes an idle connection at the moment of the
-/// next request, that exchange fails (RFC 9110, section 9.2.2).
+/// Sends HTTP/1.1 requests (RFC 9112) to one endpoint. Thread-safe. Each exchange under way has a
+/// separate connection, and connections are kept for later exchanges while the agent (or the pool
+/// that it was given) exists. Redirects are not followed, no content coding is requested, and no
+/// request is ever sent twice: when the peer closes an idle connection at the moment of the next
+/// request, that exchange fails (RFC 9110, section 9.2.2).
 ///
 /// An exchange fails with `HttpException` when the answer violates RFC 9112, is ambiguous, exceeds
 /// a limit, or is cut off; failures of the stream are reported unchanged.
@@ -42,15 +42,16 @@ class TARNIK_EXPORT UserAgent : public virtual Object {
  public:
   using Completion = std::function<void(Exception*, ClientResponse*, PendingRequestItem*)>;
 
-  /// Sends `request` and returns at once. The completion runs exactly once, on an I/O thread, with
-  /// exactly one of exception and response; both are valid only during the call. It must not block,
-  /// and an exception that leaves it ends the process, as on any thread. When `timeoutMicroseconds`
-  /// is not 0 and that time passes first, the exchange ends with a `TimeoutException`; the time is
-  /// measured from the call to the last byte of the answer.
+  /// Sends `request` and returns immediately. The completion runs exactly once, on an I/O thread,
+  /// with exactly one of exception and response; both are valid only during the call. It must not
+  /// block, and an exception that leaves it ends the process, as on any thread. When
+  /// `timeoutMicroseconds` is not 0 and that time passes first, the exchange ends with a
+  /// `TimeoutException`; the time is measured from the call to the last byte of the answer.
   ///
   /// Throws `InvalidArgumentException` for a null request, an empty completion or a spec whose host
-  /// is neither a name nor an address, `InvalidStateException` for a request that was sent before,
-  /// and whatever the spec throws when it cannot begin to connect. The completion then never runs.
+  /// is neither a name nor an address, `InvalidStateException` for a request that has already been
+  /// sent, and whatever the spec throws when it cannot begin to connect. The completion then never
+  /// runs.
   virtual Ref<PendingRequestItem> SendAsync(ClientRequest* request, Completion completion,
                                             unsigned long timeoutMicroseconds) = 0;
 

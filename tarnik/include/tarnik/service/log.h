@@ -16,7 +16,7 @@ namespace Tarnik::Service {
 /// a new logger has level 4. The levels are 1 fatal, 2 error, 3 failure of one request, 4 warning,
 /// 5 notice, 6 information, 7 trace of operations, 8 and 9 detail.
 ///
-/// Loggers of the same name share one level. Safe from any thread.
+/// Loggers of the same name share one level. Thread-safe.
 class TARNIK_EXPORT StaticLogger {
  public:
   /// `name` must live as long as the process (a literal).

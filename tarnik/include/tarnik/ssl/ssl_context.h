@@ -27,9 +27,8 @@ class TARNIK_EXPORT SSLStream : public System::Stream {
                                     HandshakeCompletion completion) = 0;
 };
 
-/// Trust and sessions shared by TLS connections. Immutable; safe from many threads. Supports
-/// TLS 1.2 and 1.3. Sessions are resumed only with the same host, on any port, and the same server
-/// name.
+/// Trust and sessions shared by TLS connections. Immutable; thread-safe. Supports TLS 1.2 and 1.3.
+/// Sessions are resumed only with the same host, on any port, and the same server name.
 class TARNIK_EXPORT SSLContext : public virtual Object {
  public:
   /// A TLS stream over `stream`. `name` is a label for diagnostics and may be empty.
@@ -48,7 +47,7 @@ struct SSLContextConfig {
   /// Trust the CAs of the operating system.
   bool useSystemStore = false;
   /// PEM files of certificate revocation lists. If there is any, every certificate of a peer's
-  /// chain is checked, and a certificate whose issuer's list is missing or out of date is refused.
+  /// chain is checked, and a certificate whose issuer's list is missing or out of date is rejected.
   std::vector<std::string> crlFiles;
   /// If not empty, the peer's certificate must also equal one of these byte for byte.
   std::vector<Ref<const Crypto::Certificate>> pinnedCertificates;

@@ -8,7 +8,7 @@
 
 namespace Tarnik::System {
 
-/// A handle to an operation under way that can be cancelled. Safe from any thread.
+/// A handle to an operation under way that can be cancelled. Thread-safe.
 class TARNIK_EXPORT CancellableItem : public virtual Object {
  public:
   /// Cancels the operation; true when it was cancelled. The operation's completion still runs, with

@@ -12,7 +12,7 @@ namespace Tarnik::System {
 /// of the zone of its calendar fields. An immutable value; comparisons use only the instant.
 ///
 /// The range is 0001-01-01T00:00:00.000000Z to 9999-12-31T23:59:59.999999Z, the years that XML
-/// Schema dateTime writes in four digits; instants outside of it are set to its nearest end.
+/// Schema dateTime writes in four digits; instants outside of it are clamped to it.
 class TARNIK_EXPORT DateTime {
  public:
   /// 1970-01-01T00:00:00Z.
@@ -21,7 +21,7 @@ class TARNIK_EXPORT DateTime {
   /// Reads the XML Schema dateTime form (XML Schema Part 2, section 3.2.7):
   /// "YYYY-MM-DDThh:mm:ss[.fraction][Z|(+|-)hh:mm]".
   ///
-  /// A time without a zone is UTC (SAML 2.0 Core, section 1.3.3). Digits of the fraction after the
+  /// A time without a zone is UTC (SAML 2.0 core, section 1.3.3). Digits of the fraction after the
   /// sixth are ignored. 24:00:00 is midnight of the next day. Throws `DateTimeFormatException` for
   /// years before 0001 or after 9999, leap seconds, zones beyond 14:00, lower-case letters, white
   /// space, and anything else that is not of this form.

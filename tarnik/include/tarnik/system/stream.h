@@ -26,8 +26,8 @@ class TARNIK_EXPORT Stream : public virtual Object {
   virtual void ReadAsync(char* buffer, std::size_t size, ReadCompletion completion) = 0;
   /// Writes all `size` bytes.
   virtual void WriteAsync(const char* data, std::size_t size, WriteCompletion completion) = 0;
-  /// Closes at once, without notifying the peer. Operations under way complete with a
-  /// `CancelledException`. Safe from any thread, any number of times.
+  /// Closes immediately, without notifying the peer. Operations under way complete with a
+  /// `CancelledException`. May be called from any thread, any number of times.
   virtual void Close() noexcept = 0;
 };
 

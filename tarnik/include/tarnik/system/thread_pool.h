@@ -13,8 +13,8 @@ namespace Tarnik::System {
 /// threads that run work items and may block.
 ///
 /// Worker threads are added while all are busy, up to `kMaxWorkers`; further items queue in order.
-/// Idle workers end after ten seconds. Safe from any thread. Threads of the pool do not run the
-/// host program's signal handlers.
+/// Idle workers end after ten seconds. Thread-safe. Threads of the pool do not run the host
+/// program's signal handlers.
 ///
 /// The process may exit while work is under way. From then on nothing is started, timers included;
 /// `exit` waits up to 200 ms for the completions and items that are running, and then continues

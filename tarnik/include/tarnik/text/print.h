@@ -47,7 +47,7 @@ class TARNIK_EXPORT DatePrintFormatter : public PrintFormatter {
 namespace Detail {
 
 /// Returns `format` with each "%N" (N from 1) replaced by argument N. Arguments are not scanned for
-/// placeholders. A percent sign that the number of an argument does not follow is kept.
+/// placeholders. A percent sign that is not followed by the number of an argument is kept.
 TARNIK_EXPORT std::string ASPrintInternal(std::string_view format,
                                           std::initializer_list<PrintFormatter> arguments);
 

@@ -59,7 +59,7 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
 
   /// The namespace that is bound to `prefix` at this element (Namespaces in XML 1.0, section 6);
   /// the empty prefix means the default namespace. Nothing when the prefix is not bound; an empty
-  /// text when the default namespace is undeclared with xmlns="". "xml" is always bound.
+  /// string when the default namespace is undeclared with xmlns="". "xml" is always bound.
   std::optional<std::string_view> LookupNamespace(std::string_view prefix) const noexcept;
 
   /// The next element in document order (XML Path Language 1.0, section 5) inside `top`: the first

@@ -9,7 +9,7 @@
 
 namespace Tarnik::Xml {
 
-/// A document that was refused. The message ends with " at line L, column C".
+/// A document that was rejected. The message ends with " at line L, column C".
 class TARNIK_EXPORT XMLParseException : public Exception {
  public:
   XMLParseException(const std::string& fault, const Position& position,

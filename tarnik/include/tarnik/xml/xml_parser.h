@@ -42,7 +42,7 @@ class TARNIK_EXPORT XMLHandler : public virtual Object {
 
 /// A handler that builds a `Document` and checks the rules of Namespaces in XML 1.0: every prefix
 /// is bound, no two attributes of an element have the same expanded name, and "xml" and "xmlns" are
-/// used correctly. It also refuses an element when that element and those around it have more than
+/// used correctly. It also rejects an element when that element and those around it have more than
 /// `kMaxOpenAttributes` attributes, so that looking up a namespace in the tree stays cheap.
 TARNIK_EXPORT Ref<XMLHandler> CreateXMLDocumentHandler();
 

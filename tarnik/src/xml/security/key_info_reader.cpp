@@ -66,7 +66,7 @@ void ReadX509Data(const ElementNode* element, KeyInfo& keyInfo) {
   }
 }
 
-// Refused, since a message must not make the reader fetch a key.
+// Rejected, since a message must not make the reader fetch a key.
 bool RefersToKeyElsewhere(const ElementNode* element) {
   return element->NamespaceUri() == kDs11Namespace && element->LocalName() == "KeyInfoReference";
 }

@@ -17,7 +17,7 @@ namespace Tarnik::Xml::Security {
 std::vector<const Node*> FindReferenceTargets(const Node* root, const ElementNode* signature,
                                               const std::vector<Reference>& references);
 
-/// The topmost node that holds `node`.
+/// The topmost node that contains `node`.
 const Node* RootOf(const Node* node) noexcept;
 
 /// True when `inner` is `outer` or is in it.

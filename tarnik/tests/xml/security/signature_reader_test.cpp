@@ -186,7 +186,7 @@ TEST(SignatureReaderTest, AcceptsWhiteSpaceInValuesAndBetweenElements) {
   EXPECT_EQ(Verdict(InsertedBefore("<ds:SignatureValue>", "<!-- value follows -->")), "valid");
 }
 
-// Above, only CDATA sections in values are refused.
+// Above, only CDATA sections in values are rejected.
 TEST(SignatureReaderTest, AcceptsCDataSectionsOutsideValues) {
   EXPECT_EQ(Verdict(InsertedBefore("<ds:SignatureValue>", "<![CDATA[ ]]>")), "valid");
   EXPECT_EQ(Verdict(InsertedBefore("<ds:SignatureValue>", "<![CDATA[]]>")), "valid");

@@ -53,7 +53,7 @@ class SignatureAlgorithmsTest
   SignOptions options_;
 };
 
-TEST_P(SignatureAlgorithmsTest, AreVerifiedLikeTheOracleDoes) {
+TEST_P(SignatureAlgorithmsTest, AreVerifiedAsByTheOracle) {
   const std::string text = Signed(options_, kUnsigned, signer_);
   ASSERT_TRUE(DevSts::VerifyXml(text, signer_.certificatePem));
   EXPECT_EQ(Verdict(text, signer_), "valid");

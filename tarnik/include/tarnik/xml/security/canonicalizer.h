@@ -11,7 +11,7 @@
 
 namespace Tarnik::Xml::Security {
 
-/// Writes the canonical form of a subtree. Stateless between calls; safe from many threads.
+/// Writes the canonical form of a subtree. Stateless between calls; thread-safe.
 class TARNIK_EXPORT Canonicalizer : public virtual Object {
  public:
   /// Writes the canonical form of `node` (a document, or an element with all its content) to

@@ -11,7 +11,7 @@
 namespace Tarnik::Xml::Security {
 
 /// Decides which key a signature is verified with. It is the only source of trust in a
-/// verification. Callers may implement it; it must be safe to use from many threads.
+/// verification. Callers may implement it; implementations must be thread-safe.
 class TARNIK_EXPORT KeyInfoResolver : public virtual Object {
  public:
   /// The trusted key for a signature with `keyInfo`, or null when there is no trusted key. Its
@@ -31,7 +31,7 @@ TARNIK_EXPORT Ref<const KeyInfoResolver> CreateTrustedCertificatesResolver(
 
 /// As above, but the certificate is selected by the issuer that the KeyInfo names: the
 /// X509IssuerSerial, or else the issuer and serial number of the first certificate in the KeyInfo.
-/// A signature that names no issuer is refused.
+/// A signature that names no issuer is rejected.
 TARNIK_EXPORT Ref<const KeyInfoResolver> CreateCertificateIssuerResolver(
     std::vector<Ref<const Crypto::Certificate>> certificates);
 

@@ -39,8 +39,8 @@ class TARNIK_EXPORT SignatureReference : public virtual Object {
 /// accepts references, and all functions about its content (`References`, `KeyInfo`, `Verify`)
 /// throw `InvalidStateException`. From then on it behaves like one that was read.
 ///
-/// A signature that was read or signed is immutable and safe from many threads, as long as nobody
-/// modifies the tree; a blank one is used by one thread at a time.
+/// A signature that was read or signed is immutable and thread-safe, as long as nobody modifies the
+/// tree; a blank one is used by one thread at a time.
 class TARNIK_EXPORT Signature : public virtual Object {
  public:
   /// The algorithms' URIs, as written. These and the results of the next accessors are valid as
@@ -66,11 +66,11 @@ class TARNIK_EXPORT Signature : public virtual Object {
   ///  - canonicalisations: those of `CreateCanonicalizer`;
   ///  - transforms: enveloped-signature and then one canonicalisation, both optional.
   ///
-  /// A reference is empty (the whole document) or "#" followed by the id of exactly one element of
-  /// the document: an attribute "ID", "Id" or "id", xml:id, or wsu:Id. No second element may have
-  /// that value in an attribute whose local name is "id" in any letter case. The target of a
-  /// reference must either enclose the signature and have the enveloped-signature transform, or be
-  /// outside of it and not have this transform.
+  /// The URI of a reference is empty (the whole document) or "#" followed by the id of exactly one
+  /// element of the document: an attribute "ID", "Id" or "id", xml:id, or wsu:Id. No second element
+  /// may have that value in an attribute whose local name is "id" in any letter case. The target of
+  /// a reference must either enclose the signature and have the enveloped-signature transform, or
+  /// be outside of it and not have this transform.
   ///
   /// Throws `XmlSecurityException` when the signature cannot be verified: `resolver` is null, an
   /// algorithm is not on the list, a reference is not as above, there is no trusted key, the key
@@ -88,14 +88,14 @@ class TARNIK_EXPORT Signature : public virtual Object {
   /// Makes `content` the only child of ds:KeyInfo, in place of the content that was set before, and
   /// removes it from its previous parent. Without this call there is no ds:KeyInfo. Throws
   /// `InvalidArgumentException` when `content` is null, contains the signature or is part of it,
-  /// `SignatureSyntaxException` when `CreateSignatureFromDom` would refuse it (`content` then has
+  /// `SignatureSyntaxException` when `CreateSignatureFromDom` would reject it (`content` then has
   /// no parent), and `InvalidStateException` unless the signature is blank; the signature is then
   /// unchanged.
   virtual void SetKeyInfo(ElementNode* content) = 0;
 
   /// Computes the digests of all references and the signature value with `key`, and writes both
   /// into the element, in Base64 without line breaks. References, transforms and keys must follow
-  /// the rules of `Verify`. Whether the element must be in the document already depends on these
+  /// the rules of `Verify`. Whether the element must already be in the document depends on these
   /// rules:
   ///  - a reference with the enveloped-signature transform must enclose the element, so the element
   ///    must be in its final position;
@@ -116,7 +116,7 @@ class TARNIK_EXPORT Signature : public virtual Object {
 
 /// Reads `element`, a ds:Signature of its document, whose children must be in the order of the
 /// schema. Throws `SignatureSyntaxException` when it violates the structure of XML Signature;
-/// algorithms and values are checked by `Verify`. Also refused, although the schema allows them:
+/// algorithms and values are checked by `Verify`. Also rejected, although the schema allows them:
 /// ds:Object, a reference without a URI, more than 16 references, RetrievalMethod, and comments or
 /// processing instructions inside values. Throws `InvalidArgumentException` when `element` is null.
 TARNIK_EXPORT Ref<Signature> CreateSignatureFromDom(ElementNode* element);
