@@ -15,9 +15,9 @@ Tarnik::Ref<Tarnik::Xml::Document> ParseXml(const std::string& text);
 /// allow.
 bool HasRelativeNamespace(const Tarnik::Xml::Document& document);
 
-/// True if libxml2 does not handle a namespace declared in the document as the standards require, so
-/// that results cannot be compared. It refuses malformed URIs, which XML allows, and does not escape
-/// them in canonical text (Canonical XML 1.0, section 2.3).
+/// True if libxml2 does not handle a namespace declared in the document as the standards require,
+/// so that results cannot be compared. It refuses malformed URIs, which XML allows, and does not
+/// escape them in canonical text (Canonical XML 1.0, section 2.3).
 bool HasOddNamespace(const Tarnik::Xml::Document& document);
 
 }  // namespace Fuzz
