@@ -20,7 +20,7 @@ using asio::ip::tcp;
 
 using Session = std::unique_ptr<SSL_SESSION, decltype(&SSL_SESSION_free)>;
 
-// Where a TLS context keeps the last session: Asio has taken OpenSSL's own place for such things.
+// Where a TLS context keeps the last session. Asio uses OpenSSL's app data for itself.
 int SessionSlot() {
   static const int slot = SSL_CTX_get_ex_new_index(0, nullptr, nullptr, nullptr, nullptr);
   return slot;
@@ -71,10 +71,10 @@ std::string BareClient::Exchange(const std::string& request) {
   boost::beast::flat_buffer buffer;
   http::response_parser<http::string_body> parser;
   http::read(stream, buffer, parser);
-  // OpenSSL would not resume the session of a connection that ends without a word.
+  // OpenSSL does not resume a session whose connection ended without a close_notify.
   SSL_set_shutdown(stream.native_handle(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
   if (parser.get().result() != http::status::ok) {
-    throw std::runtime_error("the service answered a bare client with an error");
+    throw std::runtime_error("the service returned an error to a bare client");
   }
   return std::move(parser.get().body());
 }

@@ -6,17 +6,17 @@
 
 namespace Bench {
 
-/// The least that an exchange over TLS can cost: blocking calls of Boost.Beast that send given
-/// bytes and read an answer, with a connection for each. Trusts one CA and checks the peer's name,
-/// and resumes TLS sessions that the peer hands out. For one thread.
+/// The lower bound of the cost of an exchange over TLS: blocking calls of Boost.Beast that send the
+/// given bytes and read the answer, over a new connection each time. Trusts one CA, checks the
+/// peer's name and resumes the peer's TLS sessions. For one thread.
 class BareClient {
  public:
   BareClient(const std::string& caFile, const std::string& host, unsigned short port);
   ~BareClient();
-  /// Sends the bytes of a whole HTTP request and returns the answer's body. Throws when anything
-  /// fails, an HTTP status other than 200 included.
+  /// Sends a complete HTTP request and returns the body of the answer. Throws on any failure,
+  /// including an HTTP status other than 200.
   std::string Exchange(const std::string& request);
-  /// How many of the exchanges resumed a session.
+  /// The number of exchanges that resumed a session.
   std::size_t Resumed() const;
 
  private:

@@ -34,7 +34,7 @@ void PeerCheck(benchmark::State& state) {
   Peer peer(sample.certificatePem);
   for (auto _ : state) {
     if (!peer.Check(sample.xml)) {
-      state.SkipWithError("the peer refused the token");
+      state.SkipWithError("the peer refuses the token");
       break;
     }
   }

@@ -10,8 +10,9 @@
 #include "bare_client.h"
 #include "sts/request_builder.h"
 
-// Acquiring a token by password, the whole exchange over TLS included, beside a bare client that
-// sends the same bytes and reads nothing of the answer. Each exchange has a connection of its own.
+// Acquires a token by password, including the whole exchange over TLS, and compares it with a bare
+// client that sends the same bytes and does not parse the answer. Each exchange has its own
+// connection.
 namespace Bench {
 namespace {
 
@@ -62,7 +63,7 @@ std::string RequestBytes(const std::string& host, int port, const std::string& t
          "\r\nContent-Type: text/xml\r\nSOAPAction: \"" + soap.action + "\"\r\n\r\n" + soap.body;
 }
 
-/// A bare client, what it sends and whether its sessions are to be resumed.
+/// A bare client, its request, and whether its sessions should be resumed.
 struct Bare {
   std::shared_ptr<BareClient> client;
   std::string request;
@@ -87,7 +88,7 @@ void BareExchange(benchmark::State& state, const Bare& bare) {
   }
   const auto expected = bare.resumes ? static_cast<std::size_t>(state.iterations()) : 0;
   if (bare.client->Resumed() - before != expected) {
-    state.SkipWithError("the bare client's sessions were not resumed as they should be");
+    state.SkipWithError("the bare client did not resume the expected number of sessions");
   }
 }
 
@@ -99,7 +100,7 @@ void Add(const std::string& name, Run run, const Subject& subject) {
       ->Unit(benchmark::kMicrosecond);
 }
 
-// The first exchange of each, which has no session to resume, is made here.
+// Makes the first exchange of each, which has no session to resume.
 void Register(const std::string& kind, const Place& place) {
   const Service service = MakeService(place);
   service->AcquireToken(kUser, kPassword, OneHour());

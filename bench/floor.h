@@ -6,13 +6,13 @@
 
 namespace Bench {
 
-/// The least that checking a signed text can cost: one RSA-2048 verification and SHA-256 of the
-/// bytes, with everything fetched and loaded before.
+/// The lower bound of the cost of checking a signed text: one RSA-2048 verification and SHA-256 of
+/// the bytes. Algorithms are fetched and keys are loaded in the constructor.
 class Floor {
  public:
   Floor();
   ~Floor();
-  /// True when the prepared signature verifies; `text` is digested besides.
+  /// Digests `text` and returns whether the prepared signature verifies.
   bool Check(const std::string& text);
 
  private:

@@ -9,7 +9,7 @@
 namespace Bench {
 namespace {
 
-// What the signature, with its certificate, adds to the text.
+// The length that the signature and its certificate add to the text.
 constexpr std::size_t kSignatureSize = 2200;
 
 std::string TimeText(long secondsFromNow) {

@@ -12,7 +12,7 @@ struct SampleToken {
   std::string certificatePem;
 };
 
-/// The token of about `size` bytes (at least 2,000), grown by groups. Made once per size.
+/// A token of about `size` bytes (at least 2,000), padded with groups. Made once for each size.
 const SampleToken& GetSampleToken(std::size_t size);
 
 }  // namespace Bench

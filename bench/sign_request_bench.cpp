@@ -20,8 +20,8 @@
 #include "sample_token.h"
 #include "sts/request_builder.h"
 
-// Making whole requests signed by RSA-SHA256, and signing two references alone, beside the floor:
-// the RSA operation alone.
+// Makes whole requests signed with RSA-SHA256, and only the signatures of two references, and
+// compares both with the lower bound: only the RSA operation.
 namespace Bench {
 namespace {
 

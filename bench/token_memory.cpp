@@ -1,5 +1,5 @@
-// Prints for each size of token: the size asked for, the bytes of its text, and the bytes of heap
-// that one living token holds, the allocator's own overhead included.
+// Prints for each size of token: the requested size, the bytes of its text, and the bytes of heap
+// memory that one token uses, including the overhead of the allocator.
 #include <malloc.h>
 #include <ssoclient/saml_token.h>
 
@@ -22,7 +22,7 @@ double TokenMemory(std::size_t size) {
   const std::string& xml = GetSampleToken(size).xml;
   std::vector<std::shared_ptr<const SsoClient::SamlToken>> tokens;
   tokens.reserve(kTokens);
-  // The first one fills caches that all share.
+  // The first token fills shared caches.
   SsoClient::CreateSamlToken(xml);
   const std::size_t before = HeapInUse();
   for (std::size_t i = 0; i < kTokens; ++i) {

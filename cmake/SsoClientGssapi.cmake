@@ -1,5 +1,5 @@
 # ssoclient_find_gssapi(FOUND): finds MIT's GSSAPI library with the Kerberos library below it, once for the whole tree, as
-# PkgConfig::SSOCLIENT_GSSAPI, and sets FOUND to whether they are installed.
+# PkgConfig::SSOCLIENT_GSSAPI, and sets FOUND to true if both are installed.
 function(ssoclient_find_gssapi found)
   if(NOT TARGET PkgConfig::SSOCLIENT_GSSAPI)
     find_package(PkgConfig REQUIRED)
@@ -8,8 +8,8 @@ function(ssoclient_find_gssapi found)
       set(${found} FALSE PARENT_SCOPE)
       return()
     endif()
-    # CMake reads "-isystem FOLDER" from its cache as a different kind of flag from the one it was in the first
-    # configuration. The second one would change the commands, and everything would be compiled again.
+    # CMake does not treat "-isystem FOLDER" in its cache like the same flag in the first configuration. A second
+    # configuration would change the commands, and everything would be compiled again.
     pkg_get_variable(folder krb5-gssapi includedir)
     set_target_properties(PkgConfig::SSOCLIENT_GSSAPI PROPERTIES
       INTERFACE_INCLUDE_DIRECTORIES "${folder}" INTERFACE_COMPILE_OPTIONS "")

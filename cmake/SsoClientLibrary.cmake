@@ -9,9 +9,9 @@ include("${CMAKE_CURRENT_LIST_DIR}/SsoClientTarget.cmake")
 #   NAME_objects  its object files
 #   NAME_static   the same object files with the include folders of SOURCES, for tests of what the shared library hides
 # with each "-" of NAME replaced by "_" in the latter two. INCLUDES is the folder of the public headers, HEADERS the
-# one below it to install, GENERATED a folder of generated private headers. The libraries are those to link;
-# REQUIRES and DEPENDENCIES are for ssoclient_install_package. SEPARATE_FOR_TESTS keeps the sources apart in a build with
-# tests, which replace some functions of one source in its calls from another.
+# folder below it that is installed, GENERATED a folder of generated private headers. The libraries are those to link;
+# REQUIRES and DEPENDENCIES are passed to ssoclient_install_package. SEPARATE_FOR_TESTS compiles each source on its own
+# in a build with tests, which replace functions of one source that other sources call.
 function(ssoclient_add_library name)
   cmake_parse_arguments(PARSE_ARGV 1 LIBRARY "SEPARATE_FOR_TESTS"
     "PACKAGE;SOURCES;INCLUDES;HEADERS;VERSION_SCRIPT;DESCRIPTION;GENERATED"
@@ -60,7 +60,8 @@ function(ssoclient_merge_folders objects folder)
   endforeach()
 endfunction()
 
-# ssoclient_link_shared_library(TARGET VERSION_SCRIPT [OPTION...])
+# ssoclient_link_shared_library(TARGET VERSION_SCRIPT [OPTION...]): sets the options and the version that the library is
+# linked with.
 function(ssoclient_link_shared_library target version_script)
   target_link_options(${target} PRIVATE ${ARGN} "-Wl,--version-script=${version_script}")
   # A sanitizer's functions are resolved by the program.

@@ -7,10 +7,10 @@ function(ssoclient_target_sanitizers)
     return()
   endif()
   set(options -fsanitize=${SSOCLIENT_SANITIZER} -fno-omit-frame-pointer -O1 -g1)
-  # In instrumented code GCC's flow analysis reports uninitialised values where there are none.
+  # In instrumented code, GCC's flow analysis reports initialised values as uninitialised.
   list(APPEND options $<$<CXX_COMPILER_ID:GNU>:-Wno-maybe-uninitialized>)
   if(SSOCLIENT_SANITIZER MATCHES "thread")
-    # Asio has fences, which GCC cannot instrument; everything shared through them is also locked.
+    # Asio uses fences, which GCC cannot instrument. Everything shared through them is also protected by locks.
     list(APPEND options $<$<CXX_COMPILER_ID:GNU>:-Wno-tsan>)
   endif()
   if(SSOCLIENT_SANITIZER MATCHES "undefined")
@@ -22,8 +22,8 @@ function(ssoclient_target_sanitizers)
   endforeach()
 endfunction()
 
-# ssoclient_target_unoptimized(TARGET...): for code that only calls the libraries under test. Under sanitizers,
-# optimising it takes longer than it saves.
+# ssoclient_target_unoptimized(TARGET...): does not optimise the targets under sanitizers. For code that only calls the
+# libraries under test, since optimising it takes longer than it saves.
 function(ssoclient_target_unoptimized)
   if(NOT SSOCLIENT_SANITIZER)
     return()

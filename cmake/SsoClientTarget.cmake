@@ -1,5 +1,5 @@
-# ssoclient_configure_target(TARGET...): compiles targets the way this tree does, without touching the settings of a
-# project that contains it.
+# ssoclient_configure_target(TARGET...): compiles targets with the options of this tree, without changing the settings
+# of a project that contains it.
 include("${CMAKE_CURRENT_LIST_DIR}/SsoClientWarnings.cmake")
 include("${CMAKE_CURRENT_LIST_DIR}/SsoClientSanitizers.cmake")
 
@@ -13,7 +13,7 @@ function(ssoclient_configure_target)
       POSITION_INDEPENDENT_CODE ON
       UNITY_BUILD OFF)
     if(SSOCLIENT_BUILD_FUZZERS)
-      # A fuzzer is guided by the coverage of the code that it calls.
+      # libFuzzer is guided by the coverage of the code that a fuzzer calls.
       target_compile_options(${target} PRIVATE -fsanitize=fuzzer-no-link)
     endif()
   endforeach()

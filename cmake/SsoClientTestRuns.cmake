@@ -1,4 +1,4 @@
-# Test programs and the way CTest runs them.
+# Functions that add test programs and register them with CTest.
 include("${CMAKE_CURRENT_LIST_DIR}/SsoClientTarget.cmake")
 
 add_custom_target(ssoclient_test_programs)
@@ -10,8 +10,8 @@ target_link_libraries(ssoclient_test_pch PRIVATE GTest::gmock)
 target_precompile_headers(ssoclient_test_pch PRIVATE
   <gmock/gmock.h> <gtest/gtest.h> <memory> <string> <vector>)
 
-# ssoclient_configure_test_target(TARGET...): compiles test code. Sanitizers check the libraries: under them, optimising
-# the tests or looking for undefined behaviour in them takes longer than it is worth.
+# ssoclient_configure_test_target(TARGET...): compiles test code. Under sanitizers, which are there to check the
+# libraries, the tests are neither optimised nor checked for undefined behaviour, since both take too long.
 function(ssoclient_configure_test_target)
   ssoclient_configure_target(${ARGN})
   ssoclient_target_unoptimized(${ARGN})
@@ -19,7 +19,7 @@ function(ssoclient_configure_test_target)
     if(SSOCLIENT_SANITIZER)
       target_compile_options(${target} PRIVATE -fno-sanitize=undefined)
     endif()
-    # Programs and libraries are compiled alike, so that they can share the precompiled header.
+    # Programs and libraries are compiled with the same options, so that they can share the precompiled header.
     set_target_properties(${target} PROPERTIES POSITION_INDEPENDENT_CODE OFF)
     if(NOT target STREQUAL "ssoclient_test_pch")
       target_precompile_headers(${target} REUSE_FROM ssoclient_test_pch)
@@ -44,8 +44,8 @@ function(ssoclient_select_tests variable)
   set(${variable} ${selected} PARENT_SCOPE)
 endfunction()
 
-# ssoclient_glob_tests(TESTS SUPPORT FOLDER): sets TESTS to the test sources below FOLDER, as ssoclient_select_tests leaves
-# them, and SUPPORT to the other sources below it, except those of probes, which are programs.
+# ssoclient_glob_tests(TESTS SUPPORT FOLDER): sets TESTS to the test sources below FOLDER that ssoclient_select_tests
+# keeps, and SUPPORT to the other sources below it, except those of probes, which are programs.
 function(ssoclient_glob_tests tests support folder)
   file(GLOB_RECURSE sources CONFIGURE_DEPENDS "${folder}/*.cpp")
   set(helpers ${sources})
@@ -57,7 +57,7 @@ function(ssoclient_glob_tests tests support folder)
 endfunction()
 
 # ssoclient_add_test_program(TARGET SHARDS SOURCE...): builds a GoogleTest program, and runs it as SHARDS processes that
-# CTest may run in parallel. With one process for each test, sanitizers would spend most of the time starting.
+# CTest may run in parallel. With one process for each test, most of the time would be spent starting sanitizers.
 function(ssoclient_add_test_program target shards)
   add_executable(${target} ${ARGN})
   ssoclient_configure_test_target(${target})

@@ -1,4 +1,4 @@
-# ssoclient_target_warnings(TARGET...): the warnings that every target of this tree is built with.
+# ssoclient_target_warnings(TARGET...): enables the warnings that every target of this tree is built with.
 option(SSOCLIENT_WARNINGS_AS_ERRORS "Treat compiler warnings as errors" OFF)
 
 function(ssoclient_target_warnings)

@@ -1,5 +1,5 @@
-// What decodes is, but for white space, the one text that encodes to it; whatever is encoded
-// decodes again; and what is refused is no Base64 to OpenSSL either.
+// Apart from white space, a text that can be decoded is the only encoding of its bytes. All bytes
+// can be encoded and decoded again. OpenSSL refuses every text that is refused here.
 #include <openssl/evp.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/text/base64.h>
@@ -27,8 +27,8 @@ bool Decode(const std::string& text, Bytes& bytes) {
   }
 }
 
-// OpenSSL passes over blanks at the ends of its own accord and over bits behind the last byte, so
-// only what it writes itself counts as Base64.
+// OpenSSL ignores blanks at both ends and unused bits after the last byte, so only a text that it
+// writes itself counts as Base64.
 bool IsBase64ForOpenSsl(const std::string& text) {
   const auto padding = static_cast<std::size_t>(
       std::find_if(text.rbegin(), text.rend(), [](char c) { return c != '='; }) - text.rbegin());

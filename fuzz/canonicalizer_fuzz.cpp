@@ -1,5 +1,5 @@
-// Whatever the parser accepts, libxml2 accepts; the canonical forms of the document and of each of
-// its first elements are its octets; and what the writer writes is the same document.
+// libxml2 accepts every text that the parser accepts, and returns the same canonical forms of the
+// document and of its first elements. The output of the writer is the same document.
 #include <tarnik/core/writer.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/security/canonicalizer.h>

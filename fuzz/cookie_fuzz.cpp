@@ -1,5 +1,6 @@
-// Whatever peers set, the header that goes back is one clean line of what they set, bounded in
-// size, and nobody else gets it. The input's lines are Set-Cookie headers of several answers.
+// Whatever a peer sets, the Cookie header returned to it is one clean line of bounded size that
+// contains only what the peer set, and no other host receives it. The lines of the input are
+// Set-Cookie headers of several answers.
 #include <tarnik/http/cookie_store.h>
 
 #include <algorithm>

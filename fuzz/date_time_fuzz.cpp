@@ -1,5 +1,5 @@
-// What is read as a date-time prints as a text that reads back as the same instant, is a dateTime
-// to an independent reader of XML Schema, and two of them stand in the order that it sees.
+// A date-time that can be read is also an xs:dateTime to libxml2, which orders two of them in the
+// same way. Printed and read again, it is the same instant.
 #include <libxml/xmlschemastypes.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/system/date_time.h>
@@ -37,7 +37,7 @@ Value ReadByLibXml2(const std::string& text) {
                                                                                   : nullptr;
 }
 
-// The other reader knows times without a zone as times of any zone, and seconds as floating point.
+// To libxml2, a time without a zone may be in any zone, and seconds are floating-point numbers.
 bool IsComparable(const std::string& text) {
   const std::size_t point = text.find('.');
   const std::size_t digits =

@@ -1,6 +1,6 @@
-// An answer means the same in whatever pieces it comes, never more than its bytes hold, is not
-// whole without its last byte, and is not changed by what follows it. The first byte is a piece's
-// size.
+// The result of parsing an answer does not depend on the size of the pieces or on bytes after the
+// answer. The body is shorter than the input, and an answer without its last byte is incomplete.
+// The first byte of the input is the size of the pieces.
 #include <tarnik/http/http_exception.h>
 
 #include <algorithm>
@@ -34,7 +34,7 @@ Answer TakeAnswer(ResponseParser& parser) {
   return answer;
 }
 
-/// The answer, or nothing when it is refused.
+/// The answer, or nothing if it is refused.
 std::optional<Answer> Read(std::string_view bytes, std::size_t pieceSize) {
   ResponseParser parser("sts.example.com:443");
   try {
@@ -48,7 +48,7 @@ std::optional<Answer> Read(std::string_view bytes, std::size_t pieceSize) {
   return TakeAnswer(parser);
 }
 
-/// How many bytes make the answer whole, if some do without the end of the connection.
+/// The length of the answer, unless only the end of the connection completes it.
 std::optional<std::size_t> OwnLength(std::string_view bytes) {
   ResponseParser parser("sts.example.com:443");
   for (std::size_t count = 0; count < bytes.size(); ++count) {

@@ -1,5 +1,5 @@
-// What is accepted as a URL has parts that can stand in a request, that make the same URL again,
-// and that an independent parser of URIs finds, too.
+// The parts of an accepted URL can be used in a request, result in the same URL when they are put
+// together again, and are the parts that libxml2 finds.
 #include <libxml/uri.h>
 #include <strings.h>
 #include <tarnik/core/exception.h>
@@ -47,7 +47,7 @@ std::string Text(const char* text) {
   return text == nullptr ? "" : text;
 }
 
-// A port may be empty (RFC 3986, section 3.2.3), but not for libxml2.
+// A port may be empty (RFC 3986, section 3.2.3), which libxml2 does not accept.
 std::string WithoutEmptyPort(std::string text) {
   const std::size_t authority = text.find("://") + 3;
   const std::size_t end = std::min(text.find_first_of("/?", authority), text.size());

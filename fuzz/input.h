@@ -11,7 +11,7 @@ inline std::string TextOf(const std::uint8_t* data, std::size_t size) {
   return {reinterpret_cast<const char*>(data), size};
 }
 
-/// Ends the run, so that libFuzzer keeps the input, unless `holds`.
+/// Unless `holds`, crashes the process, so that libFuzzer keeps the input.
 inline void Require(bool holds) {
   if (!holds) {
     __builtin_trap();

@@ -1,5 +1,5 @@
-// Every answer ends in a result or in one of the stated exceptions, with each of the four parsers;
-// and a result is what an independent reader finds in its place, in an answer without a fault.
+// Each of the four parsers returns a result or throws one of the documented exceptions. A result is
+// the content that libxml2 finds at the same place, and its answer contains no fault.
 #include <devsts/xml_security.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/reader.h>
@@ -18,7 +18,7 @@ using SsoClient::ResponseHandlerImpl;
 
 const std::string kStatus = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/";
 
-/// What a parser makes of the text, or nothing when it is refused.
+/// The result of a parser, or nothing if it refuses the text.
 template <class Parse>
 auto ResultOf(const std::string& text, const Parse& parse)
     -> std::optional<decltype(parse(std::declval<Tarnik::Reader*>()))> {
@@ -30,7 +30,8 @@ auto ResultOf(const std::string& text, const Parse& parse)
   }
 }
 
-/// The canonical text of the element reached by first children of these names, or nothing.
+/// The canonical text of the element at the end of a path of first children with these names, or
+/// nothing if there is no such element.
 std::optional<std::string> TextAt(const std::string& xml,
                                   std::initializer_list<const char*> names) {
   std::string path = "/*";

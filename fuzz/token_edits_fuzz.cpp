@@ -1,6 +1,6 @@
-// Whatever a resolver lets through tells what was signed, and an independent reader of XML
-// signatures lets it through, too. The input says how signed assertions are edited, not what they
-// hold.
+// Every token that a resolver accepts has the signed values, and an independent verifier of XML
+// signatures accepts it too. The input determines how signed assertions are edited, not what they
+// contain.
 #include <fuzzer/FuzzedDataProvider.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>
@@ -30,7 +30,7 @@ struct Original {
   std::string values;
 };
 
-// One of each canonical form, each with other parts.
+// One assertion for each canonical form, with different parts.
 const std::vector<Original>& Originals() {
   static const std::vector<Original> originals = [] {
     std::vector<Original> all;

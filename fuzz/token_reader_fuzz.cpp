@@ -1,5 +1,5 @@
-// Reading a token ends in a token or in one of the stated exceptions. A token keeps its text, and
-// its canonical text is a token that tells the same.
+// Reading a token returns a token or throws one of the documented exceptions. A token keeps its
+// text, and its canonical text is a token with the same values.
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/crypto_exception.h>
@@ -13,7 +13,7 @@
 
 namespace {
 
-// Longer than the seeds' dates reach, whatever becomes of them.
+// Long enough for the dates of all seeds, however they are mutated.
 constexpr long kTolerance = 300'000'000'000;
 
 std::shared_ptr<const SsoClient::SamlToken> Read(const std::string& text) {
@@ -32,7 +32,7 @@ std::shared_ptr<const SsoClient::SamlToken> ReadTree(const std::string& text) {
   try {
     return SsoClient::CreateSamlTokenFromDom(document->RootElement(), kTolerance);
   } catch (const Tarnik::Xml::Security::XmlSecurityException&) {
-    // A relative namespace URI: there is no canonical text.
+    // There is no canonical text with a relative namespace URI.
     return nullptr;
   }
 }

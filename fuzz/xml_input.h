@@ -8,16 +8,16 @@
 
 namespace Fuzz {
 
-/// The document of this text, or null when it is refused.
+/// The parsed document, or null if the text is refused.
 Tarnik::Ref<Tarnik::Xml::Document> ParseXml(const std::string& text);
 
-/// True when a namespace declared in the document is a relative URI, which canonical XML does not
+/// True if a namespace declared in the document is a relative URI, which Canonical XML does not
 /// allow.
 bool HasRelativeNamespace(const Tarnik::Xml::Document& document);
 
-/// True when libxml2 has something of its own to say about a namespace declared in the document. It
-/// refuses URIs that it takes for malformed, which XML leaves free, and does not escape them in
-/// canonical text, as Canonical XML 1.0, section 2.3, demands; there it is no oracle.
+/// True if libxml2 does not handle a namespace declared in the document as the standards require,
+/// so that results cannot be compared. It refuses malformed URIs, which XML allows, and does not
+/// escape them in canonical text (Canonical XML 1.0, section 2.3).
 bool HasOddNamespace(const Tarnik::Xml::Document& document);
 
 }  // namespace Fuzz

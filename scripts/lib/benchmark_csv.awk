@@ -10,14 +10,14 @@ BEGIN { FS = "," }
 }
 
 /_median/ {
-  # The name says how the time is measured as well.
+  # The name also says how the time is measured.
   name = $1
   gsub(/"|_median|\/process_time|\/real_time/, "", name)
   cpu[name] = $column["cpu_time"]
   real[name] = $column["real_time"]
 }
 
-# Returns whether a value is missing, and says so for the row TITLE of a table.
+# Returns whether a value is missing, and if so, prints a message for the row TITLE of a table.
 function missing(title, first, second) {
   if (first != "" && second != "") return 0
   print title ": no result, see build/bench.log"

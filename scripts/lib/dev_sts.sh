@@ -1,5 +1,5 @@
-# Sourced by scripts that run the dev STS in the background. It reads its commands from a pipe that stays open until the
-# script ends, however that happens, and it ends with the pipe.
+# Sourced by scripts that run the dev STS in the background. The dev STS reads its commands from a pipe that stays open
+# until the script ends for any reason, and ends when the pipe is closed.
 
 # open_dev_sts_commands FOLDER: opens the pipe for all dev STSs of the script as file descriptor 3. Other children of
 # the script must be started with 3>&-, or they keep the dev STS running.

@@ -1,5 +1,5 @@
 # Joins the C++ sources that the input lists, sorted, into files of the folder "joined": at most twelve of one folder.
-# Prints the name of each file with that of its first source. "root" is the folder of the sources.
+# Prints the name of each file and of its first source. "root" is the folder of the sources.
 function append(path,   line) {
   print "#line 1 \"" root "/" path "\"" >unit
   while ((getline line < path) > 0) print line >unit

@@ -1,4 +1,4 @@
-# Replaces the places in joined sources by those in the original ones: UNIT:LINE: by SOURCE:LINE:
+# Replaces positions in joined sources by those in the original sources: UNIT:LINE: by SOURCE:LINE:
 {
   if (match($0, /^[^ :]*\/joined\/[0-9]+\.cpp:[0-9]+:/)) {
     split(substr($0, 1, RLENGTH - 1), place, ":")

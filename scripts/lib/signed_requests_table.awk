@@ -8,7 +8,7 @@ END {
   printf "\n%-50s %12s %12s %14s\n", "signed requests", "ours us", "floor us", "ours/floor"
   row("by certificate", "CertificateRequest")
   row("by token of 6 KB", "TokenRequest/6000")
-  row("the signature alone, of 2 KB", "SignRequest/2000")
+  row("only the signature, of 2 KB", "SignRequest/2000")
   print "Aim: ours/floor at most 1.1."
   exit failed
 }
