@@ -63,7 +63,7 @@ void Require(bool condition, const std::string& demand) {
   }
 }
 
-// The library would misinterpret a principal in its own form, "service/host@REALM".
+// GSSAPI would misinterpret the form of a Kerberos principal, "service/host@REALM".
 bool IsServiceAtHost(const std::string& name) {
   const auto at = name.find('@');
   return at != std::string::npos && at != 0 && at + 1 != name.size() && name.rfind('@') == at &&

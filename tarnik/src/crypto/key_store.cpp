@@ -52,7 +52,7 @@ int AnswerPrompt(UI* dialog, UI_STRING* question) noexcept {
 OwnedUiMethod CreateUiMethod(const OpenSsl::ErrorScope& errors) {
   OwnedUiMethod method(UI_create_method("caller"));
   if (method == nullptr || UI_method_set_reader(method.get(), AnswerPrompt) != 0) {
-    throw CryptoException(errors.Describe("The passphrase cannot be asked for"));
+    throw CryptoException(errors.Describe("Cannot ask for the passphrase"));
   }
   return method;
 }

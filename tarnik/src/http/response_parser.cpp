@@ -140,7 +140,7 @@ bool ResponseParser::ReadHead() {
 
 void ResponseParser::SkipInterim(int code) {
   if (code == kSwitchingProtocols) {
-    Refuse("switches to another protocol, unasked");
+    Refuse("switches to another protocol without being asked");
   }
   if (++interimCount_ > kMaxInterimAnswers) {
     Refuse("is preceded by more than " + std::to_string(kMaxInterimAnswers) + " interim answers");

@@ -71,7 +71,8 @@ class LogRegistry {
 
 namespace {
 
-// So that one call writes one line, whatever a user name or a fault text contains.
+// Escapes control characters, so that one call writes one line, whatever a user name or a fault
+// text contains.
 std::string EscapeControls(const std::string& text) {
   if (std::none_of(text.begin(), text.end(), IsControl)) {
     return text;

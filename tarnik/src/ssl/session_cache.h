@@ -19,7 +19,7 @@ class SessionCache {
 
   static constexpr std::size_t kMaxSessions = 64;
   static constexpr std::size_t kMaxSessionsOfPeer = 4;
-  /// How long the peer's verification in a full handshake is relied on.
+  /// How long the result of verifying the peer in a full handshake is trusted.
   static constexpr std::chrono::minutes kMaxAge{60};
 
   void Put(const std::string& peer, OpenSsl::OwnedSslSession session, Clock::time_point now);

@@ -15,7 +15,8 @@
 namespace Tarnik::Ssl {
 namespace {
 
-// OpenSSL does not report why a file is unreadable, nor that a folder is missing.
+// OpenSSL words the failure to read a file differently from the system, and does not report a
+// missing folder at all.
 void RequireReadable(const std::string& path, int mode, const std::string& what) {
   if (path.empty() || path.find('\0') != std::string::npos) {
     throw SSLException(what + " '': the path is empty or holds a NUL.");

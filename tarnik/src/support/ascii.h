@@ -6,7 +6,8 @@
 
 namespace Tarnik {
 
-/// Classes of ASCII characters, in every locale.
+// Classes of ASCII characters, independent of the locale.
+
 constexpr bool IsAscii(char c) noexcept {
   return static_cast<unsigned char>(c) < 0x80;
 }

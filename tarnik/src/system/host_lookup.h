@@ -14,8 +14,7 @@ struct SocketAddress {
   socklen_t length;
 };
 
-/// The result of a lookup: addresses in the order in which to try them, or the reason for their
-/// absence.
+/// The result of a lookup: addresses in the order in which to try them, or why there are none.
 struct HostAddresses {
   std::vector<SocketAddress> addresses;
   std::string error;

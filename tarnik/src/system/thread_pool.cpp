@@ -70,8 +70,7 @@ void RequireCallable(const std::function<void()>& function) {
 // The pool is never destroyed, since its threads use it until the process ends.
 ThreadPoolImpl& ThePool() {
   static ThreadPoolImpl* const pool = [] {
-    // Before the exit handler below is registered, so that it runs before those that OpenSSL
-    // registers.
+    // Exit handlers run in reverse order: the one that is registered below runs before OpenSSL's.
     OpenSsl::Initialise();
     auto* created = new ThreadPoolImpl();
     created->IncRef();

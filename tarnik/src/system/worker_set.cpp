@@ -86,8 +86,8 @@ bool WorkerSet::WaitForItem(std::unique_lock<std::mutex>& lock, std::function<vo
   if (phase_ == Phase::kFrozen) {
     workerChanged_.notify_all();
   }
-  const auto hasReason = [this] { return phase_ == Phase::kEnding || !items_.empty(); };
-  while (phase_ == Phase::kFrozen || !hasReason()) {
+  const auto canContinue = [this] { return phase_ == Phase::kEnding || !items_.empty(); };
+  while (phase_ == Phase::kFrozen || !canContinue()) {
     if (phase_ == Phase::kFrozen) {
       lock.unlock();
       ParkThread();

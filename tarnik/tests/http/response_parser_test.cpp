@@ -255,7 +255,7 @@ const BadAnswer kBadAnswers[] = {
     {Head("X(: value"), kName},
     {Head("X\xC3\xA9: value"), kName},
     {"HTTP/1.1 101 Switching Protocols\r\nUpgrade: x\r\n\r\n",
-     "switches to another protocol, unasked"},
+     "switches to another protocol without being asked"},
     {Chunks("-1\r\nh\r\n0\r\n\r\n"), kBadChunk},
     {Chunks("+1\r\nh\r\n0\r\n\r\n"), kBadChunk},
     {Chunks("g\r\nh\r\n0\r\n\r\n"), kBadChunk},

@@ -32,7 +32,7 @@ class TARNIK_EXPORT Object {
  public:
   /// Called when the first reference is taken. Does nothing unless overridden.
   virtual void OnFirstRef() const noexcept {}
-  /// Called when the last reference was removed, before destruction. Does nothing unless
+  /// Called when the last reference has been removed, before destruction. Does nothing unless
   /// overridden.
   virtual void OnLastRef() const noexcept {}
 };

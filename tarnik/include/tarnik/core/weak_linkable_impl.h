@@ -15,7 +15,7 @@ namespace Tarnik {
 /// Filled by `WeakLinkableImpl::AttachWeakRef`; safe to use from any thread.
 class WeakRef {
  public:
-  /// The object, or null when it was destroyed or none was attached.
+  /// The object, or null if it has been destroyed or none was attached.
   Ref<const Object> Lock() const { return state_ == nullptr ? nullptr : state_->Lock(); }
 
  private:

@@ -30,7 +30,7 @@ class TARNIK_EXPORT CustomConnectionSpec : public ConnectionSpec {
   /// True when requests go to a proxy and therefore contain the whole URL.
   virtual bool IsProxy() const = 0;
   /// Opens a stream. The completion runs once, on an I/O thread: with the stream and null, or with
-  /// an exception, in which case any stream is closed.
+  /// an exception, in which case a stream passed with it is closed.
   virtual Ref<System::CancellableItem> StartConnect(ConnectCompletion completion) = 0;
 };
 

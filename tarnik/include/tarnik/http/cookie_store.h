@@ -15,8 +15,8 @@ namespace Tarnik::Http {
 class TARNIK_EXPORT CookieStore : public virtual Object {
  public:
   /// Stores the cookie of a Set-Cookie header that `host` sent in the answer to a request for
-  /// `path`. Cookies are ignored as RFC 6265, section 5.3 says: of another domain, with control
-  /// characters, without a name, or Secure cookies over plain HTTP.
+  /// `path`. Ignores a cookie for another domain, without a name, with control characters, and a
+  /// Secure cookie that was received over plain HTTP (RFC 6265, sections 5.2 and 5.3).
   virtual void Store(std::string_view host, std::string_view path, bool isSecure,
                      std::string_view setCookie, const System::DateTime& now) = 0;
   /// The Cookie header for a request (RFC 6265, section 5.4); empty when there is nothing to send.

@@ -9,7 +9,7 @@
 namespace Tarnik::Ssl {
 
 /// A failure of TLS configuration, of a handshake or of a connection. The message names the cause
-/// and, once there is one, the peer.
+/// and, for a connection, the peer.
 class TARNIK_EXPORT SSLException : public IOException {
  public:
   explicit SSLException(std::string message,

@@ -63,7 +63,7 @@ class TARNIK_EXPORT Node : public Object {
 
   Tree* tree_;
   ParentNode* parent_ = nullptr;
-  Node* next_ = nullptr;  // the last child points to the first one
+  Node* next_ = nullptr;  // circular: the last child points to the first
   unsigned line_ = 0;
   unsigned column_ : 23;
   unsigned hasCDataSection_ : 1;  // used by text nodes

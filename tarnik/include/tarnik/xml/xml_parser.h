@@ -46,8 +46,8 @@ class TARNIK_EXPORT XMLHandler : public virtual Object {
 /// `kMaxOpenAttributes` attributes, so that looking up a namespace in the tree stays cheap.
 TARNIK_EXPORT Ref<XMLHandler> CreateXMLDocumentHandler();
 
-/// The number of attributes, including namespace declarations, that an element of a parsed document
-/// and all elements around it may have together.
+/// The maximum number of attributes, including namespace declarations, that an element of a parsed
+/// document and all elements around it may have together.
 inline constexpr std::size_t kMaxOpenAttributes = 1024;
 
 /// Limits of parsed documents.

@@ -22,7 +22,7 @@ struct C14nOptions {
 bool ReadC14nAlgorithm(std::string_view algorithm, C14nOptions& options) noexcept;
 
 /// Writes the canonical form of `node`, a document or an element with all its content, without the
-/// element `omitted` (null for nothing), which is the enveloped-signature transform. Throws
+/// element `omitted` (null for nothing), as the enveloped-signature transform requires. Throws
 /// `XmlSecurityException` for a relative namespace URI in scope, and with the exclusive method for
 /// an unbound prefix. The output is incomplete after a failure.
 void WriteCanonical(const Node* node, const ElementNode* omitted, const C14nOptions& options,

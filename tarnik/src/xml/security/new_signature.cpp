@@ -126,7 +126,7 @@ Ref<SignatureReference> NewSignature::AddReference(std::string_view uri,
   read.digestMethod = digestMethod;
   ReferenceElements elements;
   elements.digestMethod = method.get();
-  // With reserved capacity, nothing below can fail.
+  // After these three calls nothing can fail.
   parts_.reserve(kMaxReferences);
   content_.references.reserve(kMaxReferences);
   content_.referenceElements.reserve(kMaxReferences);

@@ -95,8 +95,7 @@ class TARNIK_EXPORT Signature : public virtual Object {
 
   /// Computes the digests of all references and the signature value with `key`, and writes both
   /// into the element, in Base64 without line breaks. References, transforms and keys must follow
-  /// the rules of `Verify`. Whether the element must already be in the document depends on these
-  /// rules:
+  /// the rules of `Verify`. Where the element must be when `Sign` is called:
   ///  - a reference with the enveloped-signature transform must enclose the element, so the element
   ///    must be in its final position;
   ///  - with inclusive canonicalisation of SignedInfo it must be there too, since namespaces and
