@@ -73,7 +73,7 @@ TEST(TokenSpecTest, HoldsItsFieldsInOrder) {
   EXPECT_EQ(spec.confirmation, CONFIRMATION_BEARER);
 }
 
-TEST(TokenSpecTest, AsksForNothingByDefault) {
+TEST(TokenSpecTest, RequestsNothingByDefault) {
   const TokenSpec spec;
   EXPECT_EQ(spec.tokenLifetimeSec, 0);
   EXPECT_TRUE(spec.audienceRestriction.empty());
@@ -85,7 +85,7 @@ TEST(TokenSpecTest, AsksForNothingByDefault) {
   EXPECT_EQ(spec.confirmation, CONFIRMATION_DEFAULT);
 }
 
-TEST(TokenSpecTest, CountsItsLifetimeIn64SignedBits) {
+TEST(TokenSpecTest, HoldsItsLifetimeIn64SignedBits) {
   EXPECT_TRUE((std::is_same_v<decltype(TokenSpec::tokenLifetimeSec), std::int64_t>));
 }
 

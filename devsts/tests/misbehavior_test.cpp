@@ -317,7 +317,7 @@ TEST(MisbehaviorTest, DripsTheAnswer) {
   EXPECT_GE(std::chrono::steady_clock::now() - start, 4ms);
 }
 
-TEST(ServerTest, HoldsAThousandExchangesAtOnce) {
+TEST(ServerTest, HandlesAThousandExchangesAtOnce) {
   constexpr std::size_t kCount = 1000;
   Server server;
   Misbehavior misbehavior = Raw();

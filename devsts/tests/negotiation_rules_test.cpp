@@ -140,7 +140,7 @@ TEST_F(NegotiationRulesTest, DoesNotBeginTwiceInOneContext) {
   EXPECT_TRUE(HoldsToken(login.client.SendNext(login.last)));
 }
 
-TEST_F(NegotiationRulesTest, TakesOneLegOfANegotiationAtATime) {
+TEST_F(NegotiationRulesTest, HandlesOneLegOfANegotiationAtATime) {
   const auto server = TwoLegServer();
   StartedLogin login(*server, alice, kService);
   std::string meanwhile;
@@ -277,7 +277,7 @@ TEST_F(NegotiationRulesTest, FailsAtTheLegThatTheScriptNames) {
   }
 }
 
-TEST_F(NegotiationRulesTest, ForgetsTheNegotiationWhenTold) {
+TEST_F(NegotiationRulesTest, ForgetsTheNegotiationIfConfigured) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.forget = true}));
   StartedLogin login(*server, alice, kService);
@@ -285,7 +285,7 @@ TEST_F(NegotiationRulesTest, ForgetsTheNegotiationWhenTold) {
   ExpectFault(login.client.SendNext(login.last), "wst:InvalidRequest", kUnknown);
 }
 
-TEST_F(NegotiationRulesTest, AnswersWithAnEmptyContextWhenTold) {
+TEST_F(NegotiationRulesTest, AnswersWithAnEmptyContextIfConfigured) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.context = ""}));
   const StartedLogin login(*server, alice, kService);
@@ -293,7 +293,7 @@ TEST_F(NegotiationRulesTest, AnswersWithAnEmptyContextWhenTold) {
   EXPECT_EQ(server->OpenNegotiations(), 0U);
 }
 
-TEST_F(NegotiationRulesTest, ContinuesInAnotherContextWhenTold) {
+TEST_F(NegotiationRulesTest, ContinuesInAnotherContextIfConfigured) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.context = "urn:uuid:another"}));
   StartedLogin login(*server, alice, kService);
@@ -306,7 +306,7 @@ TEST_F(NegotiationRulesTest, ContinuesInAnotherContextWhenTold) {
   EXPECT_EQ(ContextIn(answer), "urn:uuid:another");
 }
 
-TEST_F(NegotiationRulesTest, OmitsTheContextWhenTold) {
+TEST_F(NegotiationRulesTest, OmitsTheContextIfConfigured) {
   Server server(Options());
   server.MisbehaveNext(Wrong({.omitContext = true}));
   NegotiationClient client(server);
@@ -314,7 +314,7 @@ TEST_F(NegotiationRulesTest, OmitsTheContextWhenTold) {
   EXPECT_EQ(ContextIn(client.SendFirst(gss.Step())), "none");
 }
 
-TEST_F(NegotiationRulesTest, AnswersWithAnotherLegWhenTold) {
+TEST_F(NegotiationRulesTest, AnswersWithAnotherLegIfConfigured) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.leg = "no leg"}));
   server->MisbehaveNext(Wrong({.leg = ""}));
@@ -330,7 +330,7 @@ TEST_F(NegotiationRulesTest, AnswersWithAnotherLegWhenTold) {
                                    Not(HasSubstr("BinaryExchange"))));
 }
 
-TEST_F(NegotiationRulesTest, SetsNoCookieWhenToldAndStillRequiresIt) {
+TEST_F(NegotiationRulesTest, SetsNoCookieIfConfiguredButStillRequiresIt) {
   const auto server = TwoLegServer();
   server->MisbehaveNext(Wrong({.omitCookie = true}));
   StartedLogin login(*server, alice, kService);

@@ -46,7 +46,7 @@ std::string LoggedInAs(const std::string& answer) {
   return ElementText(AssertionIn(answer), "saml2:NameID");
 }
 
-TEST_F(NegotiationTest, LogsInByOneLeg) {
+TEST_F(NegotiationTest, LogsInWithOneLeg) {
   const Server server(Options());
   NegotiationClient client(server);
   GssClient gss(alice, kService);
@@ -72,7 +72,7 @@ TEST_F(NegotiationTest, LogsInAClientThatRequestsNoProofOfTheService) {
 }
 
 // With DCE_STYLE (RFC 4757, section 7.1), Kerberos itself has a third message.
-TEST_F(NegotiationTest, TakesTheLegsThatTheMechanismHas) {
+TEST_F(NegotiationTest, TakesAsManyLegsAsTheMechanismNeeds) {
   const Server server(Options());
   NegotiationClient client(server);
   GssClient gss(alice, kService, GssClient::kUsualFlags | GSS_C_DCE_STYLE);
@@ -87,7 +87,7 @@ TEST_F(NegotiationTest, TakesTheLegsThatTheMechanismHas) {
   EXPECT_EQ(server.OpenNegotiations(), 0U);
 }
 
-TEST_F(NegotiationTest, AsksForTheSignatureOfTheMechanisms) {
+TEST_F(NegotiationTest, RequestsTheSignatureOfTheMechanisms) {
   Server server(Options());
   server.SetNegotiationScript({.requestMic = true});
   NegotiationClient client(server);
@@ -142,7 +142,7 @@ TEST_F(NegotiationTest, RefusesALegWithoutTheSignatureOfTheMechanisms) {
   }
 }
 
-TEST_F(NegotiationTest, AsksForMoreLegsWhenTheLoginIsDone) {
+TEST_F(NegotiationTest, RequestsMoreLegsWhenTheLoginIsComplete) {
   Server server(Options());
   server.SetNegotiationScript({.moreLegs = 3});
   NegotiationClient client(server);
@@ -161,7 +161,7 @@ TEST_F(NegotiationTest, AsksForMoreLegsWhenTheLoginIsDone) {
   EXPECT_THAT(answer, Not(HasSubstr("BinaryExchange")));
 }
 
-TEST_F(NegotiationTest, CountsWhatItSees) {
+TEST_F(NegotiationTest, RecordsAndCountsLegs) {
   Server server(Options());
   server.SetNegotiationScript({.requestMic = true, .moreLegs = 1});
   NegotiationClient client(server);
@@ -205,7 +205,7 @@ TEST_F(NegotiationTest, BindsTheTokenToTheKeyThatSignedTheFirstLeg) {
   EXPECT_THAT(AssertionIn(answer), HasSubstr("urn:oasis:names:tc:SAML:2.0:cm:holder-of-key"));
 }
 
-TEST_F(NegotiationTest, IssuesWhatTheFirstLegAskedFor) {
+TEST_F(NegotiationTest, IssuesWhatTheFirstLegRequested) {
   Server server(Options());
   const std::string token = AssertionIn(Ask(server, AliceEnvelope()));
   server.SetNegotiationScript({.requestMic = true});
@@ -217,7 +217,7 @@ TEST_F(NegotiationTest, IssuesWhatTheFirstLegAskedFor) {
   EXPECT_THAT(assertion, HasSubstr(">bob@EXAMPLE.COM</saml2:NameID></del:Delegate>"));
 }
 
-TEST_F(NegotiationTest, ChecksAnActAsTokenWhenTheLoginIsDone) {
+TEST_F(NegotiationTest, ChecksAnActAsTokenWhenTheLoginIsComplete) {
   Server server(Options());
   const std::string token = AssertionIn(Ask(server, AliceEnvelope()));
   server.SetNegotiationScript({.requestMic = true});
@@ -257,7 +257,7 @@ TEST_F(NegotiationTest, RefusesNegotiationsWithoutAKeytab) {
               "This service does not negotiate: it has no keytab");
 }
 
-TEST_F(NegotiationTest, DoesNotBeginWithAKeytabThatIsMissing) {
+TEST_F(NegotiationTest, DoesNotStartWithoutItsKeytab) {
   ServerOptions options;
   options.negotiation.keytab = realm->Folder() + "/missing.keytab";
   try {
@@ -343,7 +343,7 @@ TEST_F(NegotiationTest, KeepsInterleavedNegotiationsApart) {
   EXPECT_EQ(LoggedInAs(second.SendNext(secondGss.Step(toSecond))), "bob@EXAMPLE.COM");
 }
 
-TEST_F(NegotiationTest, NegotiatesOnThreadsSideBySide) {
+TEST_F(NegotiationTest, NegotiatesOnThreadsInParallel) {
   Server server(Options());
   server.SetNegotiationScript({.requestMic = true, .moreLegs = 1});
   constexpr int kThreads = 8;

@@ -98,7 +98,7 @@ TEST(RenewTest, RefusesABearerToken) {
               "The RenewTarget is not a holder-of-key token");
 }
 
-TEST(RenewTest, RefusesAnotherKeyThanTheTokens) {
+TEST(RenewTest, RefusesAKeyOtherThanTheTokens) {
   const Server server;
   const std::string token = HolderToken(server, Holder());
   ExpectFault(AskToRenew(server, token, Holder("another holder")), "wst:FailedAuthentication",
@@ -143,7 +143,7 @@ TEST(RenewTest, RefusesATokenThatIsForgedRevokedOrUnknown) {
               "The RenewTarget is unknown");
 }
 
-TEST(RenewTest, RenewsAnExpiredTokenOnlyIfItsRestrictionSaysSo) {
+TEST(RenewTest, RenewsAnExpiredTokenOnlyIfItsRestrictionAllowsIt) {
   for (const bool renewExpired : {false, true}) {
     ServerOptions options;
     options.assertion = ValidFrom(-100, -10);
@@ -172,7 +172,7 @@ TEST(RenewTest, RefusesATokenThatIsNotYetValid) {
               "The RenewTarget is not yet valid");
 }
 
-TEST(RenewTest, PostdatesATokenOnlyIfItsRestrictionSaysSo) {
+TEST(RenewTest, PostdatesATokenOnlyIfItsRestrictionAllowsIt) {
   for (const bool postdatable : {false, true}) {
     ServerOptions options;
     options.assertion.postdatable = postdatable;
@@ -193,7 +193,7 @@ TEST(RenewTest, PostdatesATokenOnlyIfItsRestrictionSaysSo) {
   }
 }
 
-TEST(RenewTest, RefusesALifetimeOfNothingAndATypeThatIsNotTheActions) {
+TEST(RenewTest, RefusesAnEmptyLifetimeAndATypeThatDoesNotMatchTheAction) {
   const Server server;
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);

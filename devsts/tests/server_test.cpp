@@ -70,7 +70,7 @@ TEST(ServerTest, LaysOutTheAnswerAsTheProtocolRequires) {
   }
 }
 
-TEST(ServerTest, PutsTheUserIntoTheAssertion) {
+TEST(ServerTest, DescribesTheUserInTheAssertion) {
   const Server server;
   const std::string alice = AssertionIn(AskFor(server, AliceEnvelope()));
   EXPECT_EQ(ElementText(alice, "saml2:NameID"), "alice@EXAMPLE.COM");

@@ -57,7 +57,7 @@ TEST(SpnegoTokenTest, FindsTheMicThatItAdds) {
                                                        Element(0xa3, Element(0x04, kMic))))));
 }
 
-TEST(SpnegoTokenTest, WritesLongLengthsThatItReads) {
+TEST(SpnegoTokenTest, ReadsTheLongLengthsThatItWrites) {
   for (const std::size_t size : {0x7fU, 0x80U, 0xffU, 0x100U, 0x1000U}) {
     const Octets mic(size, 7);
     EXPECT_EQ(MicIn(WithMic(Answer(), NegState::AcceptIncomplete, mic)), mic) << size;
@@ -92,7 +92,7 @@ TEST(SpnegoTokenTest, RefusesAMessageCutAtAnyByte) {
   }
 }
 
-TEST(SpnegoTokenTest, SurvivesAnyByteInAnyPlace) {
+TEST(SpnegoTokenTest, SurvivesAnyByteAtAnyPosition) {
   std::size_t refusals = 0;
   for (const Octets& whole : {FirstLeg(), Answer(Element(0xa3, Element(0x04, kMic)))}) {
     for (std::size_t place = 0; place < whole.size(); ++place) {

@@ -151,7 +151,7 @@ TEST(TlsTest, ResumesSessions) {
   }
 }
 
-TEST(TlsTest, DoesNotResumeWhenToldNotTo) {
+TEST(TlsTest, DoesNotResumeSessionsIfDisabled) {
   ServerOptions options;
   options.tls.sessionResumption = false;
   const Server server(options);

@@ -149,7 +149,7 @@ TEST(SignXmlTest, RefusesAKeyThatDoesNotLoad) {
   EXPECT_THROW(SignXml(kDocument, "no key", Make(KeyType::Rsa2048).certificatePem), XmlError);
 }
 
-TEST(SignXmlTest, RefusesAKeyOfAnotherTypeThanTheAlgorithms) {
+TEST(SignXmlTest, RefusesAKeyThatDoesNotFitTheAlgorithm) {
   EXPECT_THROW(Sign(Make(KeyType::EcP256), {}), XmlError);
 }
 
@@ -160,7 +160,7 @@ TEST(VerifyXmlTest, SaysWhyThereIsNothingToVerify) {
   EXPECT_EQ(VerifyXml("<!DOCTYPE a><a/>", certificate).reason, "a document type is not accepted");
 }
 
-TEST(VerifyXmlTest, RefusesTwoElementsOfOneId) {
+TEST(VerifyXmlTest, RefusesTwoElementsWithTheSameId) {
   const Credential credential = Make(KeyType::Rsa2048);
   const std::string text = Tampered(Sign(credential, {}), "</a:Root>", "<b Id=\"_1\"/></a:Root>");
   EXPECT_EQ(VerifyXml(text, credential.certificatePem).reason, "two elements have the id _1");

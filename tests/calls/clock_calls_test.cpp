@@ -20,12 +20,12 @@ constexpr char kTimes[] =
     "<wsu:Created>2024-03-05T07:08:09.010Z</wsu:Created>"
     "<wsu:Expires>2024-03-05T07:18:09.010Z</wsu:Expires>";
 
-TEST_F(ClockCallsTest, ALifetimeBeginsAndEndsByOneReading) {
+TEST_F(ClockCallsTest, ALifetimeUsesOneReadingOfTheClock) {
   EXPECT_THAT(BuiltXml(*BuildLifetime(600)), HasSubstr(kTimes));
   EXPECT_EQ(Recorded().clockReadings, 1);
 }
 
-TEST_F(ClockCallsTest, ATimestampBeginsAndEndsByOneReading) {
+TEST_F(ClockCallsTest, ATimestampUsesOneReadingOfTheClock) {
   EXPECT_THAT(BuiltXml(*BuildSecurityHeader(10)), HasSubstr(kTimes));
   EXPECT_EQ(Recorded().clockReadings, 1);
 }

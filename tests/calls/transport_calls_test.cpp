@@ -67,7 +67,7 @@ TEST_F(TransportCallsTest, AClientHoldsItsSpecForItsLifetime) {
   EXPECT_EQ(Recorded().lastSpec->RefCount(), 1);
 }
 
-TEST_F(TransportCallsTest, EachSessionHasAnAgentAndCookiesOfItsOwn) {
+TEST_F(TransportCallsTest, EachSessionHasItsOwnAgentAndCookies) {
   const HttpsClient client(kHttps, sslContext_.get(), "", kTimeout, false);
   Recorded().log.clear();
   const auto first = client.CreateSession();
@@ -78,7 +78,7 @@ TEST_F(TransportCallsTest, EachSessionHasAnAgentAndCookiesOfItsOwn) {
   EXPECT_NE(Recorded().agents[0], Recorded().agents[1]);
 }
 
-TEST_F(TransportCallsTest, SessionsOfASharedAgentMakeNothing) {
+TEST_F(TransportCallsTest, SessionsOfASharedAgentCreateNothing) {
   const auto agent = Tarnik::MakeRef<FakeUserAgent>();
   const HttpsClient client(agent.get(), kHttps, kTimeout);
   client.CreateSession();

@@ -179,7 +179,7 @@ TEST(CreateSamlTokenDescriptionTest, WritesTokenWithAllParts) {
             "isSolution=true,confirmationType=1]");
 }
 
-TEST(CreateSamlTokenDescriptionTest, AsksForEachValueOnceInItsOrder) {
+TEST(CreateSamlTokenDescriptionTest, ReadsEachValueOnceInOrder) {
   const FakeToken token;
   CreateSamlTokenDescription(token);
   EXPECT_EQ(token.asked,

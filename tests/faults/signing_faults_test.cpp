@@ -115,7 +115,7 @@ TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenTheCryptographicLibraryFails) 
 }
 
 // Each construction step fails in turn: nothing leaks, and no partly built object is returned.
-TEST_F(SigningFaultsTest, LeakNothingWhenASignatureCannotBeBegun) {
+TEST_F(SigningFaultsTest, LeakNothingWhenASignatureCannotBeCreated) {
   std::size_t failures = 0;
   for (bool happened = true; happened; ++failures) {
     Ref<Signature> made;

@@ -85,7 +85,7 @@ TEST_F(TokenFaultsTest, ForgedTokenIsNeverAcceptedWhenMemoryRunsOut) {
 
 class CryptoFaultsTest : public TokenFaultsTest, public testing::WithParamInterface<int> {};
 
-TEST_P(CryptoFaultsTest, AreNeverTakenForAGoodSignature) {
+TEST_P(CryptoFaultsTest, MakeVerificationFail) {
   std::size_t calls = 0;
   for (bool happened = true; happened; ++calls) {
     const InjectedFault fault(FaultKind::kCrypto, calls, GetParam());
@@ -97,7 +97,7 @@ TEST_P(CryptoFaultsTest, AreNeverTakenForAGoodSignature) {
   EXPECT_GE(calls, 8U);
 }
 
-TEST_P(CryptoFaultsTest, DoNotHelpAForgery) {
+TEST_P(CryptoFaultsTest, NeverMakeAForgeryValid) {
   for (const Forgery& forgery : Forgeries()) {
     std::size_t calls = 0;
     for (bool happened = true; happened; ++calls) {

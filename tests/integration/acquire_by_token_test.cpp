@@ -68,7 +68,7 @@ TEST_F(AcquireByTokenTest, DelegatesAndKeepsTheRightToDelegate) {
   EXPECT_TRUE(IsBoundTo(*token, Holder()));
 }
 
-TEST_F(AcquireByTokenTest, DelegationsLineUpInTheirOrder) {
+TEST_F(AcquireByTokenTest, DelegationsAreListedInOrder) {
   const auto first = ByToken(*AcquireBound(), DelegatedTo("bob@EXAMPLE.COM"));
   const auto second = ByToken(*first, DelegatedTo("machine@EXAMPLE.COM"));
   const auto third = ByToken(*second, DelegatedTo("carol@EXAMPLE.COM"));
@@ -119,7 +119,7 @@ TEST_F(AcquireByTokenTest, AHolderOfKeyTokenMayBeTheActAsToken) {
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine"));
 }
 
-TEST_F(AcquireByTokenTest, NobodyActsForASubjectThatDidNotAllowIt) {
+TEST_F(AcquireByTokenTest, RefusesToActForTheSubjectOfATokenThatIsNotDelegable) {
   EXPECT_EQ(MessageOf<SsoException>([] { ByToken(*MachineToken(), OnBehalfOf(Acquire())); }),
             "Unexpected SOAP fault: wst:InvalidRequest; request failed.");
   EXPECT_THAT(Sts().LastRequest().answeredFault, HasSubstr("may not be delegated to machine@"));

@@ -97,7 +97,7 @@ TEST_F(AcquireTokenTest, DelegationIsReadBackAsAChain) {
   EXPECT_EQ(chain[0].delegate, (PrincipalId{"machine", "EXAMPLE.COM"}));
 }
 
-TEST_F(AcquireTokenTest, TokenTravelsInsideAnActAsRequest) {
+TEST_F(AcquireTokenTest, TokenIsAcceptedAsActAsToken) {
   TokenSpec delegable = TenMinutes();
   delegable.delegable = true;
   TokenSpec actAs = TenMinutes();
@@ -111,7 +111,7 @@ TEST_F(AcquireTokenTest, TokenTravelsInsideAnActAsRequest) {
   EXPECT_EQ(chain.back().delegate.name, "machine");
 }
 
-TEST_F(AcquireTokenTest, MarkupAndForeignLettersReachTheServiceUnchanged) {
+TEST_F(AcquireTokenTest, MarkupAndNonAsciiLettersReachTheServiceUnchanged) {
   const std::string password = "p<&>\"']]>\t\xC3\xA4\xF0\x9F\x94\x91 ";
   DevSts::Users users;
   users["j\xC3\xBCrgen&co@example.com"].password = password;

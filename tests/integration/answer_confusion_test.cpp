@@ -36,7 +36,7 @@ bool IsAnsweredAlike(Operation one, Operation other) {
   return one == other || (issues(one) && issues(other));
 }
 
-TEST_P(AnswerConfusionTest, OnlyAnAnswerOfItsKindIsTaken) {
+TEST_P(AnswerConfusionTest, OnlyAnAnswerOfTheSameKindIsAccepted) {
   const auto [asked, answered] = GetParam();
   Arguments arguments;
   arguments.token = AcquireBound();

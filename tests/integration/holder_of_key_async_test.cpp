@@ -153,10 +153,10 @@ void EditHolderCertificate(DevSts::Server& server, const std::string& text) {
   });
 }
 
-class TroubleAsyncTest : public HolderOfKeyTest,
+class FailureAsyncTest : public HolderOfKeyTest,
                          public testing::WithParamInterface<std::tuple<Operation, Trouble>> {};
 
-TEST_P(TroubleAsyncTest, ArrivesAsTheSynchronousOperationThrowsIt) {
+TEST_P(FailureAsyncTest, EqualsThatOfTheSynchronousOperation) {
   const auto& [operation, trouble] = GetParam();
   Arguments arguments;
   arguments.token = AcquireBound();
@@ -236,7 +236,7 @@ std::vector<Trouble> Troubles() {
   };
 }
 
-INSTANTIATE_TEST_SUITE_P(EveryOperation, TroubleAsyncTest,
+INSTANTIATE_TEST_SUITE_P(EveryOperation, FailureAsyncTest,
                          testing::Combine(testing::ValuesIn(kOperations),
                                           testing::ValuesIn(Troubles())),
                          [](const auto& tested) {

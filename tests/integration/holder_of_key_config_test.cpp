@@ -105,7 +105,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 class HolderOfKeyConfigTest : public HolderOfKeyTest {};
 
-TEST_F(HolderOfKeyConfigTest, LongerRsaKeysAreTaken) {
+TEST_F(HolderOfKeyConfigTest, LongerRsaKeysAreAccepted) {
   const DevSts::Credential credential = CredentialOf(DevSts::KeyType::Rsa3072);
   EXPECT_TRUE(IsBoundTo(*HolderService(credential)->AcquireToken(kUser, kPassword, TenMinutes()),
                         credential));

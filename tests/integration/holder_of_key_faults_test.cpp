@@ -110,7 +110,7 @@ TEST_P(PresentedTokenFaultTest, TokenThatTheServiceForgotIsRefused) {
   ExpectRejected(CallNow(Presenting(), *service, arguments), Place() + " is unknown");
 }
 
-TEST_P(PresentedTokenFaultTest, TokenThatAStrangerSignedIsRefused) {
+TEST_P(PresentedTokenFaultTest, TokenSignedByAStrangerIsRefused) {
   std::string xml = AcquireBound()->Xml();
   EraseSignature(xml);
   const DevSts::Credential stranger = Sts().StrangerCredential();
@@ -138,7 +138,7 @@ TEST_F(HolderOfKeyFaultTest, TokenThatHasNotBegunIsRefused) {
   ExpectUnexpectedFault(Present(Operation::Renew, token), "wst:UnableToRenew");
 }
 
-TEST_F(HolderOfKeyFaultTest, AnotherKeyThanTheTokensIsRefused) {
+TEST_F(HolderOfKeyFaultTest, KeyOtherThanTheTokensIsRefused) {
   const auto token = AcquireBound();
   // The token names the verification key, and the request is signed with another one.
   ExpectUnexpectedFault(Present(Operation::Token, token, Stranger()), "wsse:FailedCheck");
@@ -197,7 +197,7 @@ TEST_F(HolderOfKeyFaultTest, EmptyActAsTokenIsRefusedBeforeAnythingIsSent) {
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
-TEST_F(HolderOfKeyFaultTest, WhatIsNotDelegableIsNotDelegated) {
+TEST_F(HolderOfKeyFaultTest, TokenThatIsNotDelegableIsNotDelegated) {
   Arguments arguments;
   arguments.token = AcquireBound(TenMinutes());
   arguments.spec.delegateTo = std::string("bob@EXAMPLE.COM");

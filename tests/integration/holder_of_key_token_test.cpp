@@ -56,7 +56,7 @@ TEST_F(HolderOfKeyTokenTest, ByPasswordIsABearerTokenIfRequested) {
   EXPECT_EQ(token->HolderOfKeyCertificate(), nullptr);
 }
 
-TEST_F(HolderOfKeyTokenTest, ByPasswordWithoutAConfigIsABearerTokenEitherWay) {
+TEST_F(HolderOfKeyTokenTest, ByPasswordWithoutAConfigIsAlwaysABearerToken) {
   for (const TokenSpec& spec : {TenMinutes(), Bearer()}) {
     const auto token = Service()->AcquireToken(kUser, kPassword, spec);
     EXPECT_EQ(token->ConfirmationType(), BEARER);
@@ -73,7 +73,7 @@ TEST_F(HolderOfKeyTokenTest, ByPasswordMayBeForADelegate) {
   EXPECT_TRUE(IsBoundTo(*token, Holder()));
 }
 
-TEST_F(HolderOfKeyTokenTest, ByCertificateIsOfTheCertificatesOwner) {
+TEST_F(HolderOfKeyTokenTest, ByCertificateBelongsToTheCertificatesOwner) {
   const auto token = HolderService()->AcquireTokenByCertificate(RenewableAndDelegable());
   EXPECT_EQ(token->Subject(), (PrincipalId{"machine", "EXAMPLE.COM"}));
   EXPECT_TRUE(token->IsSolution());
@@ -94,7 +94,7 @@ TEST_F(HolderOfKeyTokenTest, ByCertificateMayActForAnother) {
   EXPECT_TRUE(IsBoundTo(*token, Holder()));
 }
 
-TEST_F(HolderOfKeyTokenTest, RequestsOfOneServiceAreSignedAnewEachTime) {
+TEST_F(HolderOfKeyTokenTest, EachRequestOfAServiceHasANewSignature) {
   const auto service = HolderService();
   std::set<std::string> signatures;
   for (int i = 0; i < 3; ++i) {

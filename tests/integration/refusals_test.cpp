@@ -67,7 +67,7 @@ TEST_F(RefusalTest, FaultCodeWithoutPrefixIsUnexpected) {
             "Unexpected SOAP fault: FailedAuthentication; request failed.");
 }
 
-TEST_F(RefusalTest, FaultIsReadWhateverTheSuccessStatus) {
+TEST_F(RefusalTest, FaultIsReadWithAnySuccessStatus) {
   DevSts::Misbehavior misbehavior;
   misbehavior.fault = DevSts::FaultAnswer{kTrust, "FailedAuthentication", "no", false, 200};
   Sts().SetMisbehavior(misbehavior);
@@ -81,7 +81,7 @@ struct StatusCase {
 
 class StatusTest : public RefusalTest, public testing::WithParamInterface<StatusCase> {};
 
-TEST_P(StatusTest, IsNamedInTheMessageAndNothingIsFollowed) {
+TEST_P(StatusTest, IsNamedInTheMessageAndNoRedirectIsFollowed) {
   DevSts::Misbehavior misbehavior;
   misbehavior.httpAnswer = DevSts::HttpAnswer{GetParam().status,
                                               GetParam().reason,
@@ -125,7 +125,7 @@ TEST_F(RefusalTest, GarbageInsteadOfHttpIsACommunicationFailure) {
   EXPECT_FALSE(CommunicationFailure().empty());
 }
 
-TEST_F(RefusalTest, NobodyListens) {
+TEST_F(RefusalTest, PortThatNoProcessListensOnIsNamed) {
   // A port that was free a moment ago and that no process listens on.
   const int probe = socket(AF_INET, SOCK_STREAM, 0);
   sockaddr_in address{};

@@ -100,7 +100,7 @@ TEST_F(RenewTokenTest, TokenThatHasNotBegunIsRefused) {
 }
 
 // Within the client's tolerance of ten minutes an expired token is still accepted.
-TEST_F(RenewTokenTest, ExpiredTokenIsRenewedIfItsRestrictionSaysSo) {
+TEST_F(RenewTokenTest, ExpiredTokenIsRenewedIfItsRestrictionAllowsIt) {
   for (const bool renewExpired : {false, true}) {
     DevSts::AssertionOptions options = ValidBetween(seconds(-100), seconds(-10));
     options.renewExpired = renewExpired;

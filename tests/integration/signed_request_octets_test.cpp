@@ -104,7 +104,7 @@ std::string Changed(std::string text, std::string_view what, std::string_view by
   return text;
 }
 
-TEST_P(SignedTextTest, ArrivesUnchangedUnderASignatureThatVerifies) {
+TEST_P(SignedTextTest, ArrivesUnchangedInARequestWhoseSignatureVerifies) {
   const Place place = std::get<0>(GetParam()).place;
   const std::string& text = std::get<1>(GetParam()).text;
   const Arguments arguments = ArgumentsWith(place, text);
@@ -186,7 +186,7 @@ class TravellingTokenTest : public HolderOfKeyTest, public testing::WithParamInt
   }
 };
 
-TEST_P(TravellingTokenTest, ActsAsUnderASignatureByCertificate) {
+TEST_P(TravellingTokenTest, IsTheActAsTokenOfARequestSignedByCertificate) {
   TokenSpec spec = TenMinutes();
   spec.actAsToken = TalkativeBearer();
   HolderService()->AcquireTokenByCertificate(spec);

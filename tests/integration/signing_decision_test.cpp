@@ -211,7 +211,7 @@ TEST_F(LocalCheckTest, LifetimeIsCheckedFirstAndNothingIsSent) {
   EXPECT_THAT(Sts().Requests(), IsEmpty());
 }
 
-TEST_F(LocalCheckTest, OneSecondIsALifetime) {
+TEST_F(LocalCheckTest, OneSecondIsAValidLifetime) {
   Arguments arguments;
   arguments.token = AcquireBound();
   arguments.spec.tokenLifetimeSec = 1;

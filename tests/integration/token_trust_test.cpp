@@ -60,7 +60,7 @@ TEST_F(TokenTrustTest, StrangersSignatureWithoutKeyInfoIsRefused) {
   EXPECT_EQ(MessageOf<InvalidSignatureException>([] { Acquire(); }), kTampered);
 }
 
-TEST_F(TokenTrustTest, FactoryWithoutAResolverAcceptsWhatAnybodySigned) {
+TEST_F(TokenTrustTest, FactoryWithoutAResolverAcceptsAnySignature) {
   AfterSigning([](std::string& xml) { Replace(xml, ">alice@", ">admin@"); });
   SecurityTokenServiceConfig config;
   const auto sslContext = TrustCa(Sts());
@@ -72,7 +72,7 @@ TEST_F(TokenTrustTest, FactoryWithoutAResolverAcceptsWhatAnybodySigned) {
   EXPECT_EQ(token->Subject().name, "admin");
 }
 
-TEST_F(TokenTrustTest, TokenIsTheServicesTextAndVerifiesElsewhere) {
+TEST_F(TokenTrustTest, TokenKeepsTheServicesTextAndVerifiesElsewhere) {
   const auto token = Acquire();
   const auto verdict = DevSts::VerifyXml(token->Xml(), Sts().SigningCertificatePem());
   EXPECT_TRUE(verdict) << verdict.reason;

@@ -30,7 +30,7 @@ class TravellingTokenShapesTest : public HolderOfKeyTest,
   }
 };
 
-TEST_P(TravellingTokenShapesTest, AreAcceptedByEveryOperationAndVerifyOnTheirOwn) {
+TEST_P(TravellingTokenShapesTest, AreAcceptedByEveryOperationAndStillVerifySeparately) {
   Arguments arguments;
   TokenSpec spec = RenewableAndDelegable();
   spec.advice = {{"urn:source", {{"urn:name", {"<&>]]>\r\n\t", ""}}}}};
@@ -91,7 +91,7 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& tested) { return tested.param.name; });
 
 /// Tokens that a caller has from other places than the answer of this service.
-class KeptTokenTest : public HolderOfKeyTest {
+class StoredTokenTest : public HolderOfKeyTest {
  protected:
   static void ExpectAccepted(std::shared_ptr<const SamlToken> token) {
     Arguments arguments;
@@ -105,14 +105,14 @@ class KeptTokenTest : public HolderOfKeyTest {
   }
 };
 
-TEST_F(KeptTokenTest, OfAFileWithDeclarationMarkAndCommentsIsAccepted) {
+TEST_F(StoredTokenTest, IsAcceptedWithDeclarationByteOrderMarkAndComments) {
   const std::string xml = AcquireBound()->Xml();
   ExpectAccepted(CreateSamlToken("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<!-- kept -->\n" +
                                  xml + "\n<!-- end -->\n"));
   ExpectAccepted(CreateSamlToken("\xEF\xBB\xBF" + xml));
 }
 
-TEST_F(KeptTokenTest, WrittenInAnotherWayIsAccepted) {
+TEST_F(StoredTokenTest, IsAcceptedWithEquivalentMarkup) {
   std::string xml = AcquireBound()->Xml();
   Replace(xml, ">alice@EXAMPLE.COM<", "><![CDATA[alice]]>&#64;EXAMPLE.COM<");
   Replace(xml, "Version=\"2.0\"", "Version='2.0'");
@@ -120,7 +120,7 @@ TEST_F(KeptTokenTest, WrittenInAnotherWayIsAccepted) {
   ExpectAccepted(CreateSamlToken(xml));
 }
 
-TEST_F(KeptTokenTest, OfADocumentIsAccepted) {
+TEST_F(StoredTokenTest, IsAcceptedFromAnotherDocument) {
   const std::string xml =
       "<a xmlns=\"urn:a\" xmlns:b=\"urn:b\"><b:c>" + AcquireBound()->Xml() + "</b:c></a>";
   const auto document = ParseXml(xml);

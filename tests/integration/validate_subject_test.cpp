@@ -40,7 +40,7 @@ TEST_F(ValidateSubjectTest, RevokingOneTokenLeavesTheOthers) {
   EXPECT_TRUE(IsValid(*other));
 }
 
-TEST_F(ValidateSubjectTest, TokenOutOfItsTimeIsNotValid) {
+TEST_F(ValidateSubjectTest, TokenOutsideItsPeriodIsNotValid) {
   for (const long start : {-200L, 100L}) {
     Sts().SetAssertionOptions(ValidBetween(seconds(start), seconds(start + 100)));
     EXPECT_FALSE(IsValid(*Acquire())) << start;

@@ -42,7 +42,7 @@ class NegotiatedLoginTest : public RealmTest, public testing::WithParamInterface
   }
 };
 
-TEST_P(NegotiatedLoginTest, GivesATokenOfTheTicketsOwner) {
+TEST_P(NegotiatedLoginTest, ReturnsATokenForTheTicketsOwner) {
   Sts().SetNegotiationScript(GetParam().script);
   const std::size_t open = Sts().OpenNegotiations();
   const auto handler = Alice();
@@ -70,7 +70,7 @@ TEST_P(NegotiatedLoginTest, SendsItsLegsInOneSession) {
   }
 }
 
-TEST_P(NegotiatedLoginTest, ServesAKeytab) {
+TEST_P(NegotiatedLoginTest, WorksWithAKeytab) {
   Sts().SetNegotiationScript(GetParam().script);
   const auto token = LogIn(*CreateGssapiNegotiationHandler(AsMachine()));
   ASSERT_NE(token, nullptr);
@@ -78,7 +78,7 @@ TEST_P(NegotiatedLoginTest, ServesAKeytab) {
   EXPECT_TRUE(token->IsSolution());
 }
 
-TEST_P(NegotiatedLoginTest, ServesOneLoginAfterTheOtherWithOneHandler) {
+TEST_P(NegotiatedLoginTest, WorksRepeatedlyWithOneHandler) {
   Sts().SetNegotiationScript(GetParam().script);
   const auto handler = Alice();
   const auto first = LogIn(*handler);
@@ -97,7 +97,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 class NegotiatedTokenTest : public RealmTest {};
 
-TEST_F(NegotiatedTokenTest, IsBoundToTheKeyOfAHolder) {
+TEST_F(NegotiatedTokenTest, IsBoundToTheConfiguredKey) {
   Sts().SetNegotiationScript(Script(true, 0));
   const auto token = HolderService()->AcquireTokenByGSS(RenewableAndDelegable(), *Alice());
   EXPECT_TRUE(IsBoundTo(*token, Holder()));
@@ -109,7 +109,7 @@ TEST_F(NegotiatedTokenTest, IsBoundToTheKeyOfAHolder) {
   EXPECT_EQ(requests[1].signature, DevSts::RequestSignature::None);
 }
 
-TEST_F(NegotiatedTokenTest, IsGoodForTheOtherOperations) {
+TEST_F(NegotiatedTokenTest, IsAcceptedByTheOtherOperations) {
   const auto service = HolderService();
   const auto token = service->AcquireTokenByGSS(RenewableAndDelegable(), *Alice());
   EXPECT_TRUE(service->ValidateSubject(*token));
@@ -117,7 +117,7 @@ TEST_F(NegotiatedTokenTest, IsGoodForTheOtherOperations) {
   EXPECT_EQ(service->AcquireTokenByToken(*token, TenMinutes())->Subject(), token->Subject());
 }
 
-TEST_F(NegotiatedTokenTest, HasWhatTheSpecAsksFor) {
+TEST_F(NegotiatedTokenTest, HasWhatTheSpecRequests) {
   TokenSpec spec = TenMinutes();
   spec.audienceRestriction = {"urn:one", "urn:two"};
   spec.tokenLifetimeSec = 300;

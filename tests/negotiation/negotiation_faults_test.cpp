@@ -48,7 +48,7 @@ TEST_F(NegotiationFaultsTest, AnEmptyContextIdEndsTheLoop) {
   EXPECT_EQ(Sts().Requests().size(), 1U);
 }
 
-TEST_F(NegotiationFaultsTest, AnEmptyContextIdStartsTheContextAnew) {
+TEST_F(NegotiationFaultsTest, AfterAnEmptyContextIdTheNextCallStartsANewNegotiation) {
   const auto context = Context();
   const auto handler = Alice();
   DevSts::LegMisbehavior leg;
@@ -127,7 +127,7 @@ TEST_F(NegotiationFaultsTest, APrincipalWithoutAnAccountIsRefused) {
       [&] { Service()->AcquireTokenByGSS(TenMinutes(), *handler); });
 }
 
-TEST_F(NegotiationFaultsTest, FailureStillEndsItsLog) {
+TEST_F(NegotiationFaultsTest, FailureStillWritesTheEndLine) {
   const LogCapture log(7);
   auto script = TwoLegs();
   script.failAtLeg = 1;

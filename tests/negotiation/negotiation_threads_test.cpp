@@ -18,7 +18,7 @@ class NegotiationThreadsTest : public RealmTest {
   NegotiationThreadsTest() { Sts().SetNegotiationScript(TwoLegs()); }
 };
 
-TEST_F(NegotiationThreadsTest, LogInSideBySide) {
+TEST_F(NegotiationThreadsTest, RunLoginsInParallel) {
   const auto service = Service();
   std::vector<std::thread> threads;
   for (int i = 0; i < 8; ++i) {
@@ -34,7 +34,7 @@ TEST_F(NegotiationThreadsTest, LogInSideBySide) {
   }
 }
 
-TEST_F(NegotiationThreadsTest, AsyncLoginsRunSideBySide) {
+TEST_F(NegotiationThreadsTest, AsyncLoginsRunInParallel) {
   const auto service = Service();
   std::vector<std::shared_ptr<GssapiNegotiationHandler>> handlers(8);
   std::vector<AsyncCall> calls(handlers.size());

@@ -23,7 +23,7 @@ TEST(ResolveQNameTest, PrefersTheInnerBinding) {
             (QName{"urn:inner", "name"}));
 }
 
-TEST(ResolveQNameTest, GivesTheDefaultToNamesWithoutPrefix) {
+TEST(ResolveQNameTest, UsesTheDefaultForNamesWithoutPrefix) {
   const auto document = ParseXml(R"(<r xmlns="urn:scope"/>)");
   EXPECT_EQ(ResolveQName(*document->RootElement(), "b", "urn:default"),
             (QName{"urn:default", "b"}));
@@ -45,7 +45,7 @@ TEST(ResolveQNameTest, LooksUpTheEmptyPrefix) {
             "Element rat 1,1 uses undefined prefix: `'");
 }
 
-TEST(ResolveQNameTest, RejectsAnUndefinedPrefixWithItsPlace) {
+TEST(ResolveQNameTest, RejectsAnUndefinedPrefixAndNamesItsPlace) {
   const auto document = ParseXml("<r xmlns:p=\"urn:p\">\n  <p:b/></r>");
   const auto* element = FindElement(document->RootElement(), "b");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { ResolveQName(*element, "a:b", "urn:default"); }),

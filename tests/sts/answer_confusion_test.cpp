@@ -71,7 +71,7 @@ std::string TokenType() {
   return "<wst:TokenType>urn:oasis:names:tc:SAML:2.0:assertion</wst:TokenType>";
 }
 
-TEST(AnswerConfusionTest, AnAnswerServesOnlyItsOwnOperation) {
+TEST(AnswerConfusionTest, AnAnswerIsAcceptedOnlyByItsOwnOperation) {
   EXPECT_THAT(OperationsThatAccept(Collection(Rstr(TokenType() + Requested(kAssertionXml)))),
               ElementsAre("issue"));
   EXPECT_THAT(OperationsThatAccept(Rstr(TokenType() + Requested(kAssertionXml))),

@@ -76,7 +76,7 @@ std::string AcceptedSubject(const std::string& answer,
 
 class AnswerWrappingTest : public testing::TestWithParam<std::tuple<ForgedId, ForgedSignature>> {};
 
-TEST_P(AnswerWrappingTest, NeverYieldsTheForgedAssertion) {
+TEST_P(AnswerWrappingTest, NeverReturnsTheForgedAssertion) {
   const auto& [id, signature] = GetParam();
   const std::string original = OriginalAssertion();
   const std::string forged = ForgedAssertion(id, signature, original);

@@ -91,7 +91,7 @@ TEST_F(CreateSecurityTokenServiceTest, SignsWithTheConfiguredKeyOrNotAtAll) {
   EXPECT_TRUE(verdict.valid) << verdict.reason;
 }
 
-TEST_F(CreateSecurityTokenServiceTest, TheKeyInfoResolverIsNotForTheService) {
+TEST_F(CreateSecurityTokenServiceTest, TheServiceIgnoresTheKeyInfoResolver) {
   const auto resolver = TrustedResolver();
   config_.keyInfoResolver = resolver.get();
   const auto service = CreateSecurityTokenService(config_);

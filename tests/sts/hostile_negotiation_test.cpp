@@ -158,7 +158,7 @@ TEST_P(HostileNegotiationTest, ALegOfMegabytesReachesTheHandlerWhole) {
   EXPECT_TRUE(handler_.received[1] == leg);
 }
 
-TEST(HostileNegotiationLoopTest, EndsWhenTheServiceNeverDoes) {
+TEST(HostileNegotiationLoopTest, EndsEvenIfTheServiceContinuesForever) {
   for (const auto* leg : {" ", "AQID"}) {
     const auto transport = std::make_shared<FakeTransport>(LegAnswer("c", Exchange(leg)));
     const SecurityTokenServiceImpl service(std::make_shared<RequestBuilderImpl>(boost::none),

@@ -159,7 +159,7 @@ TEST(RequestSigningTokenTest, TheSignatureNamesThePresentedToken) {
   EXPECT_THAT(request.body, HasSubstr("<Assertion ID=\"_presented\"/>"));
 }
 
-TEST(RequestSigningTokenTest, AMalformedTokenTextLeavesTheRequestAsItWas) {
+TEST(RequestSigningTokenTest, AMalformedTokenTextLeavesTheRequestUnchanged) {
   const FakeSamlToken broken("<A>");
   SoapRequest request;
   EXPECT_THROW(BuilderWithKey().BuildValidateRequest(broken, request),
@@ -180,7 +180,7 @@ constexpr char kUtility[] =
     "oasis-200401-wss-wssecurity-utility-1.0.xsd\"";
 
 // The ids of the signed elements are new for each request.
-TEST(RequestSigningTokenTest, IdsInTokensDoNotDivertTheSignature) {
+TEST(RequestSigningTokenTest, IdsInTokensDoNotAffectWhatIsSigned) {
   for (const std::string& attributes :
        {std::string("u:Id=\"Body\"") + kUtility, std::string("id=\"Timestamp\"")}) {
     SoapRequest request;
@@ -206,7 +206,7 @@ TEST(RequestSigningTokenTest, TokensMayNotContainTheIdsOfTheRequest) {
   }
 }
 
-TEST(RequestSigningDelegationTest, ADelegatedTokenIsSignedForWithoutUseKey) {
+TEST(RequestSigningDelegationTest, ARequestForADelegatedTokenHasNoUseKey) {
   auto spec = SpecOf(60);
   spec.delegateTo = "bob";
   SoapRequest request;
@@ -216,7 +216,7 @@ TEST(RequestSigningDelegationTest, ADelegatedTokenIsSignedForWithoutUseKey) {
   EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
 }
 
-TEST(RequestSigningCertificateTest, AnExpiredCertificateSignsNothing) {
+TEST(RequestSigningCertificateTest, NothingIsSignedWithAnExpiredCertificate) {
   const RequestBuilderImpl builder(ConfigOf(KeyCredential(DevSts::KeyType::Rsa2048, -2h, -1h)));
   for (const BuildOperation& operation :
        {BuildOperation(ByPassword), BuildOperation(InitialLeg), BuildOperation(ByCertificate),

@@ -43,7 +43,7 @@ TEST(ParseNegotiationResponseTest, TheFinalAnswerHasTheTokenAndPerhapsALeg) {
   }
 }
 
-TEST(ParseNegotiationResponseTest, AResponseOutsideOfACollectionIsIntermediate) {
+TEST(ParseNegotiationResponseTest, AResponseOutsideACollectionIsIntermediate) {
   const auto response = ParseNegotiation(
       Envelope(Collection(Rstr(kSamlType + Requested(kAssertionXml), " Context=\"final\"")) +
                Rstr(kExchange, " Context=\"intermediate\"")));

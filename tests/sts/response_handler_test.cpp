@@ -155,7 +155,7 @@ TEST(ResponseHandlerImplTest, FailuresOfTheReaderPassUnchanged) {
   EXPECT_EQ(assertion, "kept");
 }
 
-TEST(ResponseHandlerImplTest, AFailureLeavesTheOutputAsItWas) {
+TEST(ResponseHandlerImplTest, AFailureLeavesTheOutputUnchanged) {
   const ResponseHandlerImpl handler;
   std::string assertion = "kept";
   EXPECT_THROW(
@@ -195,7 +195,7 @@ TEST(ParseIssueResponseTest, TheFirstOfTwoAssertionsCounts) {
             kCanonicalAssertion);
 }
 
-TEST(ParseIssueResponseTest, AFirstResponseWithoutAnAssertionIsNotPassedOver) {
+TEST(ParseIssueResponseTest, AFirstResponseWithoutAnAssertionIsNotSkipped) {
   EXPECT_EQ(
       Failure([] { ParseIssue(Envelope(Collection(Rstr("") + Rstr(Requested(kAssertionXml))))); }),
       kFormat);
@@ -205,7 +205,7 @@ TEST(ParseIssueResponseTest, AFirstResponseWithoutAnAssertionIsNotPassedOver) {
             kFormat);
 }
 
-TEST(ParseIssueResponseTest, ComparesNoNamespaces) {
+TEST(ParseIssueResponseTest, DoesNotCompareNamespaces) {
   EXPECT_EQ(ParseIssue(R"(<a:E xmlns:a="urn:a"><a:Body><RequestSecurityTokenResponseCollection>)"
                        "<a:RequestSecurityTokenResponse><RequestedSecurityToken><a:Assertion/>"
                        "</RequestedSecurityToken></a:RequestSecurityTokenResponse>"

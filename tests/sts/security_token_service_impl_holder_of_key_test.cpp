@@ -192,7 +192,7 @@ TEST(HolderOfKeyOperationsAsyncTest, RequestsEqualTheSynchronousOnes) {
             "7 Renewing token " + CreateSamlTokenDescription(presented) + " for 77 more seconds");
 }
 
-TEST(HolderOfKeyOperationsAsyncTest, ThreadsMaySignWithOneServiceThatIsReleasedMeanwhile) {
+TEST(HolderOfKeyOperationsAsyncTest, ThreadsMaySignWithOneServiceThatIsReleasedAtTheSameTime) {
   constexpr int kThreads = 4;
   constexpr int kRounds = 8;
   const FakeSts sts = StsWithKey(IssueAnswer());

@@ -284,7 +284,7 @@ class WaitingHandler final : public NegotiationHandler {
   std::promise<void> isGoingOn;
 };
 
-TEST(NegotiatedLoginAsyncTest, ACallReturnsAtOnceAndWorksWithACopyOfTheService) {
+TEST(NegotiatedLoginAsyncTest, ACallReturnsAtOnceAndUsesACopyOfTheService) {
   const FakeSts sts({LastLegAnswer()});
   auto service = sts.Service();
   const std::weak_ptr<const SecurityTokenService> original = service;

@@ -59,7 +59,7 @@ class SecurityTokenServiceImplTest : public testing::Test {
   std::shared_ptr<FakeTokenFactory> factory_ = std::make_shared<FakeTokenFactory>();
 };
 
-TEST_F(SecurityTokenServiceImplTest, SendsTheRequestAndMakesATokenOfTheAnswer) {
+TEST_F(SecurityTokenServiceImplTest, SendsTheRequestAndMakesATokenFromTheAnswer) {
   const auto token = MakeService()->AcquireToken("alice", "hunter2", OneHour());
   ASSERT_NE(token, nullptr);
   EXPECT_EQ(token->Xml(), kCanonicalAssertion);
@@ -73,7 +73,7 @@ TEST_F(SecurityTokenServiceImplTest, SendsTheRequestAndMakesATokenOfTheAnswer) {
   EXPECT_THAT(factory_->tolerances, ElementsAre(600));
 }
 
-TEST_F(SecurityTokenServiceImplTest, EveryOperationHasASessionOfItsOwn) {
+TEST_F(SecurityTokenServiceImplTest, EveryOperationHasItsOwnSession) {
   const auto service = MakeService();
   service->AcquireToken("alice", "pw", OneHour());
   service->AcquireToken("alice", "pw", OneHour());

@@ -52,7 +52,7 @@ TEST(ReadAdviceTest, ReadsNoAdvice) {
   EXPECT_TRUE(ReadAdvice(fragment.Cursor()).empty());
 }
 
-TEST(ReadAdviceTest, RefusesByTheReadingRules) {
+TEST(ReadAdviceTest, EnforcesTheReadingRules) {
   const std::pair<const char*, const char*> cases[] = {
       {"<rsa:Advice/>", "Element 'rsa:Advice' has unexpected namespace"},
       {"<saml2:Advice x=\"\"/>", "Unexpected attributes on element 'saml2:Advice'"},

@@ -77,7 +77,7 @@ TEST(ReadAssertionTest, ReadsAnyPrefixAndTheDefaultNamespace) {
   ExpectAllValues(Read(xml));
 }
 
-TEST(ReadAssertionTest, LetsAdviceAndStatementsBeAbsent) {
+TEST(ReadAssertionTest, AcceptsMissingAdviceAndStatements) {
   for (int present = 0; present < 8; ++present) {
     AssertionText text(kNow);
     if ((present & 1) == 0) {
@@ -143,7 +143,7 @@ TEST(ReadAssertionTest, RefusesElementsAfterTheLastStatement) {
   EXPECT_EQ(Refusal(second.ToXml()), "Unexpected elements under Assertion");
 }
 
-TEST(ReadAssertionTest, RefusesAnotherOrder) {
+TEST(ReadAssertionTest, RefusesPartsInAnotherOrder) {
   AssertionText statements(kNow);
   std::swap(statements.authnStatement, statements.attributeStatement);
   EXPECT_EQ(Refusal(statements.ToXml()), "Unexpected elements under Assertion");
@@ -158,7 +158,7 @@ TEST(ReadAssertionTest, RefusesAnotherOrder) {
   EXPECT_EQ(Refusal(signature.ToXml()), "Expected element 'Issuer' not found.");
 }
 
-TEST(ReadAssertionTest, RefusesStatementsOfAnotherNamespaceByName) {
+TEST(ReadAssertionTest, RefusesStatementsOfAnotherNamespaceAndNamesThem) {
   for (const char* name : {"Advice", "AuthnStatement", "AttributeStatement"}) {
     AssertionText text(kNow);
     text.advice.clear();
@@ -178,13 +178,13 @@ TEST(ReadAssertionTest, RefusesAnotherRoot) {
             "Expected element 'Assertion' not found.");
 }
 
-TEST(ReadAssertionTest, AcceptsFurtherNamespaceDeclarations) {
+TEST(ReadAssertionTest, AcceptsAdditionalNamespaceDeclarations) {
   AssertionText text(kNow);
   text.attributes += R"( xmlns="urn:default" xmlns:other="urn:other")";
   ExpectAllValues(Read(text.ToXml()));
 }
 
-TEST(ReadAssertionTest, RefusesFurtherAttributes) {
+TEST(ReadAssertionTest, RefusesAdditionalAttributes) {
   for (const char* attribute : {" x=\"\"", " xml:lang=\"en\"", " xml:id=\"_a1\"", " Id=\"_a1\"",
                                 " xsi:type=\"saml2:AssertionType\"", " saml2:ID=\"_a1\""}) {
     AssertionText text(kNow);
@@ -208,7 +208,7 @@ TEST(ReadAssertionTest, RefusesMissingOrBrokenAttributes) {
   }
 }
 
-TEST(ReadAssertionTest, NamesTheFirstFaultInReadingOrder) {
+TEST(ReadAssertionTest, ReportsTheFirstFaultInReadingOrder) {
   AssertionText text(kNow);
   text.subject = "<x/>";
   text.conditions = "<y/>";

@@ -338,7 +338,7 @@ TEST(CreateSamlTokenTest, ReadsOnlyUtf8) {
   }
 }
 
-TEST(CreateSamlTokenTest, RefusesDepthWithoutRecursion) {
+TEST(CreateSamlTokenTest, RefusesDeepNestingWithoutRecursion) {
   AssertionText text;
   std::string deep;
   for (int i = 0; i < 100'000; ++i) {
@@ -348,7 +348,7 @@ TEST(CreateSamlTokenTest, RefusesDepthWithoutRecursion) {
   EXPECT_THROW(CreateSamlToken(text.ToXml()), XMLParseException);
 }
 
-TEST(CreateSamlTokenTest, RefusesAttributesOfOneExpandedName) {
+TEST(CreateSamlTokenTest, RefusesTwoAttributesWithTheSameExpandedName) {
   AssertionText text;
   text.attributes += " Version=\"2.0\"";
   EXPECT_THROW(CreateSamlToken(text.ToXml()), XMLParseException);

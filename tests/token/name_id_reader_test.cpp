@@ -26,7 +26,7 @@ TEST(ReadNameIdTest, LeavesAnAbsentFormatEmpty) {
   EXPECT_EQ(ReadNameId(fragment.Cursor(), "Issuer").format, "");
 }
 
-TEST(ReadNameIdTest, RefusesByTheReadingRules) {
+TEST(ReadNameIdTest, EnforcesTheReadingRules) {
   const std::pair<const char*, const char*> cases[] = {
       {"", "Expected element 'Issuer' not found."},
       {"<saml2:NameID>i</saml2:NameID>", "Expected element 'Issuer' not found."},

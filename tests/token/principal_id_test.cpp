@@ -11,7 +11,7 @@
 namespace SsoClient::Testing {
 namespace {
 
-TEST(PrincipalIdTest, EqualsWithoutRegardToLetterCase) {
+TEST(PrincipalIdTest, IgnoresLetterCase) {
   EXPECT_TRUE((PrincipalId{"Alice", "Example.COM"} == PrincipalId{"alice", "example.com"}));
   EXPECT_TRUE((PrincipalId{"", ""} == PrincipalId{"", ""}));
   EXPECT_TRUE((PrincipalId{"ABCDEFGHIJKLMNOPQRSTUVWXYZ", "abcdefghijklmnopqrstuvwxyz"} ==

@@ -88,7 +88,7 @@ class RecordingFactory final : public SamlTokenFactoryDefault {
   mutable long elementTolerance = 0;
 };
 
-TEST(SamlTokenFactoryDefaultTest, HonoursASubclassWhereNoToleranceIsGiven) {
+TEST(SamlTokenFactoryDefaultTest, CallsASubclassWithTheDefaultTolerance) {
   const RecordingFactory factory;
   const SamlTokenFactory& face = factory;
   EXPECT_EQ(face.CreateToken("text"), nullptr);

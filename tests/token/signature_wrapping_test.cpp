@@ -52,7 +52,7 @@ using Attack = std::tuple<Place, ForgedId, ForgedSignature>;
 
 class SignatureWrappingTest : public testing::TestWithParam<Attack> {};
 
-TEST_P(SignatureWrappingTest, NeverYieldsTheForgedAssertion) {
+TEST_P(SignatureWrappingTest, NeverReturnsTheForgedAssertion) {
   const auto& [place, id, signature] = GetParam();
   const std::string original = OriginalAssertion();
   const std::string xml = Arranged(place, ForgedAssertion(id, signature, original), original);
@@ -117,7 +117,7 @@ TEST(SignatureWrappingControlTest, AcceptsTheOriginalNextToAnotherAssertion) {
 }
 
 // Id attributes of other names with the same value.
-TEST(SignatureWrappingTest, RefusesASecondElementOfTheSameId) {
+TEST(SignatureWrappingTest, RefusesASecondElementWithTheSameId) {
   const std::string original = OriginalAssertion();
   const auto resolver = TrustedResolver();
   for (const char* sameId : {"<x ID=\"_a1\"/>", "<x Id=\"_a1\"/>", "<x xml:id=\"_a1\"/>"}) {

@@ -60,7 +60,7 @@ class SplitValuesTest : public testing::TestWithParam<SplitValue> {
 };
 
 // The signer does not matter: not even the trusted signer may do this.
-TEST_P(SplitValuesTest, AreRefusedAlsoWhenSigned) {
+TEST_P(SplitValuesTest, AreRefusedEvenWhenSigned) {
   for (const char* node : {"<!---->", "<!--x-->", "<?p?>", "<?p x?>", "<x/>", "<x>y</x>"}) {
     const std::string xml = SignedXml(SplitBy(UnsignedXml(), GetParam(), node));
     ASSERT_TRUE(DevSts::VerifyXml(xml, TrustedCredential().certificatePem));

@@ -44,7 +44,7 @@ TEST(ReadSamlAttributeTest, LeavesAbsentNamesEmpty) {
   EXPECT_TRUE(attribute.values.empty());
 }
 
-TEST(ReadSamlAttributeTest, ReadsEmptyValuesOnlyWhenAsked) {
+TEST(ReadSamlAttributeTest, ReadsEmptyValuesOnlyIfRequested) {
   const std::string text =
       R"(<saml2:Attribute Name="n"><saml2:AttributeValue xsi:type="xs:string"/>)"
       R"(<saml2:AttributeValue>a</saml2:AttributeValue>)"
@@ -56,7 +56,7 @@ TEST(ReadSamlAttributeTest, ReadsEmptyValuesOnlyWhenAsked) {
   EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadSamlAttribute(refused.Cursor()); }), kTextOnly);
 }
 
-TEST(ReadSamlAttributeTest, TakesOnlyAValueWithoutContentForEmpty) {
+TEST(ReadSamlAttributeTest, TreatsOnlyAValueWithoutContentAsEmpty) {
   for (const char* content : {"<!---->", "<?p?>", "<x/>", "<!---->a"}) {
     Fragment fragment(std::string("<saml2:Attribute Name=\"n\"><saml2:AttributeValue>") + content +
                       "</saml2:AttributeValue></saml2:Attribute>");
@@ -67,7 +67,7 @@ TEST(ReadSamlAttributeTest, TakesOnlyAValueWithoutContentForEmpty) {
   }
 }
 
-TEST(ReadSamlAttributeTest, RefusesByTheReadingRules) {
+TEST(ReadSamlAttributeTest, EnforcesTheReadingRules) {
   const std::string open = "<saml2:Attribute Name=\"n\">";
   const std::string close = "</saml2:Attribute>";
   const std::pair<std::string, std::string> cases[] = {
@@ -165,7 +165,7 @@ TEST(ReadAttributeStatementTest, SetsTheSolutionFlagForTrueOnly) {
   EXPECT_FALSE(ReadAttributes("").isSolution);
 }
 
-TEST(ReadAttributeStatementTest, LetsALaterSolutionAttributeWin) {
+TEST(ReadAttributeStatementTest, UsesTheLastSolutionAttribute) {
   EXPECT_FALSE(ReadAttributes(AttributeText(kIsSolutionAttribute, {"true"}) +
                               AttributeText(kIsSolutionAttribute, {"false"}))
                    .isSolution);
@@ -174,14 +174,14 @@ TEST(ReadAttributeStatementTest, LetsALaterSolutionAttributeWin) {
                   .isSolution);
 }
 
-TEST(ReadAttributeStatementTest, RefusesNoneOrSeveralSolutionValues) {
+TEST(ReadAttributeStatementTest, RequiresExactlyOneSolutionValue) {
   EXPECT_EQ(AttributesRefusal(AttributeText(kIsSolutionAttribute, {})),
             "No value found for attribute isSolution.");
   EXPECT_EQ(AttributesRefusal(AttributeText(kIsSolutionAttribute, {"true", "true"})),
             "More than one value found for attribute isSolution.");
 }
 
-TEST(ReadAttributeStatementTest, TakesTheFirstValueOfNames) {
+TEST(ReadAttributeStatementTest, UsesTheFirstValueOfNames) {
   const SubjectAttributes attributes = ReadAttributes(AttributeText(kGivenName, {"Ada", "x"}) +
                                                       AttributeText(kSurname, {"Byron", "y"}));
   EXPECT_EQ(attributes.names.givenName, "Ada");
@@ -195,7 +195,7 @@ TEST(ReadAttributeStatementTest, LeavesNamesEmptyWithoutValue) {
   EXPECT_EQ(ReadAttributes(AttributeText(kGivenName, {})).names.givenName, "");
 }
 
-TEST(ReadAttributeStatementTest, LetsLaterNamesWin) {
+TEST(ReadAttributeStatementTest, UsesTheLastNames) {
   EXPECT_EQ(ReadAttributes(AttributeText(kSurname, {"a"}) + AttributeText(kSurname, {"b", "c"}))
                 .names.surname,
             "b");
@@ -204,7 +204,7 @@ TEST(ReadAttributeStatementTest, LetsLaterNamesWin) {
       "");
 }
 
-TEST(ReadAttributeStatementTest, LeavesAttributesOfOtherNames) {
+TEST(ReadAttributeStatementTest, IgnoresAttributesOfOtherNames) {
   const SubjectAttributes attributes = ReadAttributes(
       AttributeText("urn:other", {"a", "b"}) +
       AttributeText("HTTP://schemas.xmlsoap.org/ws/2005/05/identity/claims/surname", {"x"}));
@@ -221,7 +221,7 @@ TEST(ReadAttributeStatementTest, RefusesEmptyValues) {
   }
 }
 
-TEST(ReadAttributeStatementTest, RefusesByTheReadingRules) {
+TEST(ReadAttributeStatementTest, EnforcesTheReadingRules) {
   EXPECT_EQ(AttributesRefusal("<saml2:EncryptedAttribute/>"),
             "Expected element 'Attribute' not found.");
   EXPECT_EQ(AttributesRefusal("text"), "Expected element 'Attribute' not found.");
@@ -273,7 +273,7 @@ TEST(ReadAuthnStatementTest, RefusesAnythingAfterAnExpectedChild) {
   }
 }
 
-TEST(ReadAuthnStatementTest, RefusesByTheReadingRules) {
+TEST(ReadAuthnStatementTest, EnforcesTheReadingRules) {
   EXPECT_EQ(AuthnRefusal(Replaced(kAuthnStatement, R"( AuthnInstant="2024-03-05T07:08:09Z")", "")),
             "Node 'saml2:AuthnStatement is missing required attribute 'AuthnInstant'");
   EXPECT_EQ(AuthnRefusal(Replaced(kAuthnStatement, "2024-03-05T07:08:09Z", "now")),

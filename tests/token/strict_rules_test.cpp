@@ -36,7 +36,7 @@ TEST(ExpectElementTest, RejectsMissingNodeTextAndOtherName) {
   }
 }
 
-TEST(ExpectElementTest, RejectsOtherNamespaceByTheElementsOwnName) {
+TEST(ExpectElementTest, RejectsOtherNamespaceAndNamesTheElement) {
   const Fragment prefixed("<ds:A/>");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { ExpectElement(&prefixed.Element(), "A", kSaml); }),
             "Element 'ds:A' has unexpected namespace");
@@ -63,7 +63,7 @@ TEST(ExpectEmptyTest, RejectsWhatIsLeft) {
   }
 }
 
-TEST(ReadTextContentTest, GivesTheTextAsItIs) {
+TEST(ReadTextContentTest, ReturnsTheTextUnchanged) {
   EXPECT_EQ(ReadTextContent(Fragment("<a>text</a>").Element()), "text");
   EXPECT_EQ(ReadTextContent(Fragment("<a> \n</a>").Element()), " \n");
   EXPECT_EQ(ReadTextContent(Fragment("<a>a<![CDATA[<b]]>&amp;c</a>").Element()), "a<b&c");
@@ -107,7 +107,7 @@ TEST(CheckAttributesTest, RejectsWhatIsLeft) {
   }
 }
 
-TEST(CheckAttributesTest, DoesNotTakeAPrefixedAttributeForTheRequiredOne) {
+TEST(CheckAttributesTest, DoesNotAcceptAPrefixedAttributeAsTheRequiredOne) {
   const Fragment fragment(R"(<saml2:A saml2:a=""/>)");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { CheckAttributes(fragment.Element(), {"a"}); }),
             "Node 'saml2:A is missing required attribute 'a'");
@@ -131,7 +131,7 @@ TEST(CheckEachAttributeTest, NamesTheMissingOne) {
             "Node 'saml2:A is missing required attribute 'Count'");
 }
 
-TEST(CheckEachAttributeTest, NamesTheOneTooMany) {
+TEST(CheckEachAttributeTest, NamesTheUnexpectedOne) {
   const Fragment type(R"(<saml2:A xsi:type="x" type="y"/>)");
   EXPECT_EQ(
       ThrownMessage<ParseException>([&] { CheckEachAttribute(type.Element(), {kTypeAttribute}); }),
@@ -162,7 +162,7 @@ TEST(CheckTypeIsNameableTest, RejectsATypeOfAnUnboundPrefix) {
             "Element saml2:Aat 2,1 uses undefined prefix: `no'");
 }
 
-TEST(ReadAttributeTest, GivesTheValueOrNamesTheMissingOne) {
+TEST(ReadAttributeTest, ReturnsTheValueOrNamesTheMissingOne) {
   const Fragment fragment(R"(<saml2:A a="x &amp; y"/>)");
   EXPECT_EQ(ReadAttribute(fragment.Element(), "a"), "x & y");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadAttribute(fragment.Element(), "b"); }),

@@ -151,7 +151,7 @@ TEST(ReadSubjectTest, RefusesAnythingAfterAnExpectedChild) {
 
 // There is an unexpected element after every child. Each message appears once the inner ones are
 // repaired.
-TEST(ReadSubjectTest, NamesTheInnermostFaultFirst) {
+TEST(ReadSubjectTest, ReportsTheInnermostFaultFirst) {
   std::string text = HolderOfKeyText();
   for (const auto& [anchor, message] : kEnds) {
     text = InsertedAfter(text, anchor, "<x/>");
@@ -163,7 +163,7 @@ TEST(ReadSubjectTest, NamesTheInnermostFaultFirst) {
   EXPECT_EQ(Read(text).principal.name, "alice");
 }
 
-TEST(ReadSubjectTest, ChecksTheMethodBeforeWhatItConfirms) {
+TEST(ReadSubjectTest, ChecksTheMethodBeforeTheConfirmationData) {
   const std::string text = Replaced(BearerText(), "cm:bearer", "cm:other");
   EXPECT_EQ(Refusal(Replaced(text, "<saml2:SubjectConfirmationData ", "<x ")),
             "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:other'");
@@ -229,7 +229,7 @@ TEST(ReadSubjectTest, PassesThePlatformsFaultsOfACertificate) {
                Tarnik::Crypto::CryptoException);
 }
 
-TEST(ReadSubjectTest, LetsBearerDataNameItsType) {
+TEST(ReadSubjectTest, AcceptsBearerDataWithAType) {
   for (const char* type :
        {"saml2:SubjectConfirmationDataType", "saml2:KeyInfoConfirmationDataType", "Untyped"}) {
     const ParsedSubject subject =
@@ -250,12 +250,12 @@ TEST(ReadSubjectTest, RefusesBearerDataOfATypeThatCannotBeNamed) {
 }
 
 // A type that requires a key does not allow one in bearer data.
-TEST(ReadSubjectTest, RefusesABearerKeyWhateverTheType) {
+TEST(ReadSubjectTest, RefusesABearerKeyWithAnyType) {
   EXPECT_EQ(Refusal(Replaced(HolderOfKeyText(), "cm:holder-of-key", "cm:bearer")),
             "Element 'saml2:SubjectConfirmationData' must be empty");
 }
 
-TEST(ReadSubjectTest, RefusesBearerDataWithFurtherContent) {
+TEST(ReadSubjectTest, RefusesBearerDataWithAdditionalContent) {
   const std::string end = "Z\"/>";
   EXPECT_EQ(Refusal(Replaced(BearerText(), end, "Z\" Recipient=\"urn:r\"/>")),
             "Unexpected attribute 'Recipient' on element 'saml2:SubjectConfirmationData'");

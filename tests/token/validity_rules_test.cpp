@@ -119,7 +119,7 @@ INSTANTIATE_TEST_SUITE_P(
         ClockCase{kEnd + 1, kLongest / kSecond + 1, ""}));
 
 // The text form of a time is in the zone in which it was written.
-TEST(CheckValidityTest, NamesTimesAsTheTokenWroteThem) {
+TEST(CheckValidityTest, ReportsTimesAsTheyAreWrittenInTheToken) {
   ParsedAssertion assertion = ValidAssertion();
   assertion.conditions.notBefore = DateTime::Parse("2024-03-05T09:08:09.010+02:00");
   assertion.conditions.notOnOrAfter = DateTime::Parse("2024-03-05T03:08:09.010-05:00");
@@ -138,7 +138,7 @@ TEST(CheckValidityTest, RequiresABearerConfirmationAsLongAsTheToken) {
   EXPECT_EQ(Refusal(assertion), "");
 }
 
-TEST(CheckValidityTest, LeavesTheConfirmationPeriodOfHolderOfKey) {
+TEST(CheckValidityTest, IgnoresTheConfirmationPeriodOfHolderOfKey) {
   ParsedAssertion assertion = ValidAssertion();
   assertion.subject.confirmationMethod = HOLDER_OF_KEY;
   assertion.subject.notOnOrAfter = At(0);

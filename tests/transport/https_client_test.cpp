@@ -54,7 +54,7 @@ TEST(HttpsClientTest, HttpsNeedsAnSslContext) {
   EXPECT_EQ(ConstructionFailure("https://sts.example/path", context.get()), kNoFailure);
 }
 
-TEST(HttpsClientTest, KeepsTheSslContextAliveAndDropsItWithItself) {
+TEST(HttpsClientTest, KeepsTheSslContextAliveForItsLifetime) {
   const auto context = Tarnik::MakeRef<FakeSslContext>();
   {
     const HttpsClient client("https://sts.example/", context.get(), "", kTimeout, false);
@@ -63,7 +63,7 @@ TEST(HttpsClientTest, KeepsTheSslContextAliveAndDropsItWithItself) {
   EXPECT_EQ(context->RefCount(), 1);
 }
 
-TEST(HttpsClientTest, PassesOnWhatTheUrlParserRefuses) {
+TEST(HttpsClientTest, PassesOnErrorsOfTheUrlParser) {
   for (const std::string url :
        {"", "sts.example", "ftp://sts.example/", "http://", "http:///path", "http://a b/",
         "http://a/\r\nX: 1", "http://a:99999/", "https://", "https://a:0/"}) {
@@ -100,7 +100,7 @@ TEST(HttpsClientTest, PlainHttpIgnoresTheSslContext) {
   EXPECT_EQ(context->RefCount(), 1);
 }
 
-TEST(HttpsClientTest, HandsThePeerNameToTheHandshake) {
+TEST(HttpsClientTest, PassesThePeerNameToTheHandshake) {
   const LoopbackServer server([](const std::string&) { return OkAnswer("ok"); });
   const auto context = Tarnik::MakeRef<FakeSslContext>();
   const std::string url = "https://127.0.0.1:" + std::to_string(server.Port()) + "/";

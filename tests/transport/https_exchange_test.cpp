@@ -241,7 +241,7 @@ INSTANTIATE_TEST_SUITE_P(Stalls, CancelledExchangeTest,
                                           testing::Values(Scheme::Http, Scheme::Https)),
                          NameOf);
 
-TEST_F(HttpsExchangeTest, AConnectionThatIsNeverAcceptedRunsIntoTheLimit) {
+TEST_F(HttpsExchangeTest, AConnectionThatIsNeverAcceptedTimesOut) {
   const FullListener listener;
   const std::string endpoint = "127.0.0.1:" + std::to_string(listener.Port());
   const HttpsClient client("http://" + endpoint + "/", nullptr, "", kTimeout, false);
@@ -293,7 +293,7 @@ TEST_F(HttpsExchangeTest, AMalformedPeerNameIsAFailureOfTheExchange) {
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
-TEST_F(HttpsExchangeTest, CookiesGoBackOnTheSameSessionOnly) {
+TEST_F(HttpsExchangeTest, CookiesAreSentBackOnlyInTheSameSession) {
   Answer(200, "OK");
   Misbehavior giving;
   giving.httpAnswer = DevSts::HttpAnswer{200, "OK", {}, kAnswer};
@@ -344,7 +344,7 @@ struct Status {
 
 class DeliveredStatusTest : public HttpsExchangeTest, public testing::WithParamInterface<Status> {};
 
-TEST_P(DeliveredStatusTest, HandsBackTheBody) {
+TEST_P(DeliveredStatusTest, ReturnsTheBody) {
   Answer(GetParam().code, GetParam().reason);
   const auto session = MakeClient(Scheme::Https, kAmpleTimeout).CreateSession();
   for (const auto& result :

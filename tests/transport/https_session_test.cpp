@@ -57,7 +57,7 @@ class HttpsSessionTest : public testing::Test {
   SoapRequest request_;
 };
 
-TEST_F(HttpsSessionTest, HandsBackAReaderOverTheAnswer) {
+TEST_F(HttpsSessionTest, ReturnsAReaderOfTheAnswer) {
   Tarnik::Ref<Tarnik::Reader> reader;
   session_.SendRequest(request_, reader);
   ASSERT_NE(reader, nullptr);
@@ -278,7 +278,7 @@ TEST(HttpsSessionWireTest, PostsTheEnvelopeWithTheTwoHeadersInOrder) {
   }
 }
 
-TEST(HttpsSessionWireTest, ASilentServerRunsIntoTheLimit) {
+TEST(HttpsSessionWireTest, AServerThatDoesNotAnswerTimesOut) {
   const LoopbackServer server([](const std::string&) { return std::string(); });
   Tarnik::Ref<Tarnik::Http::ConnectionSpec> spec;
   CreateSsoConnectionSpec("127.0.0.1", server.Port(), false, spec);

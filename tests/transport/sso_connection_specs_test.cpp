@@ -181,7 +181,7 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, RunsAHandshakeWithHostAndServerName) 
   EXPECT_EQ(context_->wraps, 2);
 }
 
-TEST_F(SsoCustomSslConnectionSpecImplTest, AFailedHandshakeComesWithItsStream) {
+TEST_F(SsoCustomSslConnectionSpecImplTest, AFailedHandshakeIsReportedWithItsStream) {
   LoopbackSocket listener;
   ASSERT_EQ(::listen(listener.Descriptor(), 1), 0);
   context_->handshakeFailure = "certificate has expired";

@@ -79,7 +79,7 @@ TEST(ElementBuilderImplTest, EachBuildMakesANewElement) {
   EXPECT_NE(Built(builder), Built(builder));
 }
 
-TEST(ElementBuilderImplTest, PassesOnWhatAnAttributeRefuses) {
+TEST(ElementBuilderImplTest, PassesOnErrorsOfAttributes) {
   for (const auto& text : UnsendableTexts()) {
     const ElementBuilderImpl builder("rsa-advice", "Advice", {{"AdviceSource", text}});
     EXPECT_EQ(
@@ -90,7 +90,7 @@ TEST(ElementBuilderImplTest, PassesOnWhatAnAttributeRefuses) {
   }
 }
 
-TEST(ElementBuilderImplTest, PassesOnWhatNamesAreRefused) {
+TEST(ElementBuilderImplTest, PassesOnErrorsOfNames) {
   const auto failure = [](const char* prefix, const char* localName,
                           const AttributeList& attributes) {
     const ElementBuilderImpl builder(prefix, localName, attributes);
@@ -120,7 +120,7 @@ TEST(TextElementBuilderImplTest, AnEmptyTextIsStillATextNode) {
   EXPECT_EQ(element->LastChild(), text);
 }
 
-TEST(TextElementBuilderImplTest, PassesOnWhatATextRefuses) {
+TEST(TextElementBuilderImplTest, PassesOnErrorsOfTexts) {
   for (const auto& unsendable : UnsendableTexts()) {
     const TextElementBuilderImpl builder("wsse", "Password", unsendable, {});
     EXPECT_EQ(
@@ -140,7 +140,7 @@ TEST(TextElementBuilderImplTest, ReplacesWhatTheOutputHeld) {
   EXPECT_EQ(XmlText(old.get()), "<a:Old/>");
 }
 
-TEST(TextElementBuilderImplTest, WhatIsReadBackIsTheTextThatWasGiven) {
+TEST(TextElementBuilderImplTest, TheTextIsReadBackUnchanged) {
   for (const std::string text :
        {"a]]>b", "<b/>&amp;", "line\r\nfeed\rtab\t", " blank ", "\xf0\x9f\x94\x91", "quote\"'"}) {
     const auto xml = BuiltXml(TextElementBuilderImpl("", "E", text, {}));
@@ -223,7 +223,7 @@ TEST(XMLCompositeBuilderTest, WithoutChildrenItBuildsExactlyItsRoot) {
   EXPECT_EQ(BuiltXml(builder), R"(<a:E b="c">text</a:E>)");
 }
 
-TEST(XMLCompositeBuilderTest, ChildrenFollowTheRootsOwnInTheOrderOfTheirAddition) {
+TEST(XMLCompositeBuilderTest, ChildrenFollowTheRootsOwnInTheOrderTheyWereAdded) {
   XMLCompositeBuilder builder(MakeTextElementBuilder("", "Root", "text"));
   builder.Add(MakeTextElementBuilder("", "Second", "2"))
       .Add(MakeTextElementBuilder("", "First", "1"));

@@ -70,7 +70,7 @@ TEST(LifetimeTest, ANegativeOneExpiresBeforeItIsCreated) {
   EXPECT_EQ(times.expires.GetUtcTime() - times.created.GetUtcTime(), -60'000'000);
 }
 
-TEST(LifetimeTest, AnEndlessOneEndsAtTheLastTime) {
+TEST(LifetimeTest, TheLongestOneExpiresAtTheLatestTime) {
   EXPECT_EQ(BuiltTimes(std::numeric_limits<std::int64_t>::max()).expires,
             DateTime::Parse("9999-12-31T23:59:59.999Z"));
 }

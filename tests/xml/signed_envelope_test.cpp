@@ -198,7 +198,7 @@ TEST(XMLSignedSoapBuilderTest, TheCertificateFormRefersToTheCertificateInTheHead
             "oasis-200401-wss-x509-token-profile-1.0#X509v3\"/></wsse:SecurityTokenReference>");
 }
 
-TEST(XMLSignedSoapBuilderTest, TheCertificateFormLeavesTheGivenHeaderAsItIs) {
+TEST(XMLSignedSoapBuilderTest, TheCertificateFormLeavesTheGivenHeaderUnchanged) {
   const auto header = BuildSecurityHeader(10);
   const auto config = ConfigOf(Credential());
   const auto builder =
