@@ -22,7 +22,7 @@ constexpr char kPassword[] = "secret";
 using Service = std::shared_ptr<SsoClient::SecurityTokenService>;
 
 /// A running dev STS and the folder with its certificates.
-struct Place {
+struct Endpoint {
   std::string url;
   std::string folder;
   bool resumes = false;
@@ -34,14 +34,14 @@ SsoClient::TokenSpec OneHour() {
   return spec;
 }
 
-Service MakeService(const Place& place) {
+Service MakeService(const Endpoint& endpoint) {
   Tarnik::Ssl::SSLContextConfig tls;
-  tls.caFiles = {place.folder + "/ca.pem"};
+  tls.caFiles = {endpoint.folder + "/ca.pem"};
   const auto sslContext = Tarnik::Ssl::CreateSSLContext(tls);
   const auto trustedKeys = Tarnik::Xml::Security::CreateTrustedCertificatesResolver(
-      Tarnik::Crypto::LoadCertificates(place.folder + "/signing.pem"));
+      Tarnik::Crypto::LoadCertificates(endpoint.folder + "/signing.pem"));
   SsoClient::SecurityTokenServiceConfig config;
-  config.url = place.url;
+  config.url = endpoint.url;
   config.sslContext = sslContext.get();
   config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
   return SsoClient::CreateSecurityTokenService(config);
@@ -70,15 +70,15 @@ struct Bare {
   bool resumes = false;
 };
 
-Bare MakeBare(const Place& place) {
+Bare MakeBare(const Endpoint& endpoint) {
   bool isHttps = false;
   std::string host;
   int port = 0;
   std::string target;
-  Tarnik::Http::ParseHttpURL(place.url, isHttps, host, port, target);
-  return {std::make_shared<BareClient>(place.folder + "/ca.pem", host,
+  Tarnik::Http::ParseHttpURL(endpoint.url, isHttps, host, port, target);
+  return {std::make_shared<BareClient>(endpoint.folder + "/ca.pem", host,
                                        static_cast<unsigned short>(port)),
-          RequestBytes(host, port, target), place.resumes};
+          RequestBytes(host, port, target), endpoint.resumes};
 }
 
 void BareExchange(benchmark::State& state, const Bare& bare) {
@@ -101,11 +101,11 @@ void Add(const std::string& name, Run run, const Subject& subject) {
 }
 
 // Makes the first exchange of each, which has no session to resume.
-void Register(const std::string& kind, const Place& place) {
-  const Service service = MakeService(place);
+void Register(const std::string& kind, const Endpoint& endpoint) {
+  const Service service = MakeService(endpoint);
   service->AcquireToken(kUser, kPassword, OneHour());
   Add("AcquireToken/" + kind, AcquireToken, service);
-  const Bare bare = MakeBare(place);
+  const Bare bare = MakeBare(endpoint);
   bare.client->Exchange(bare.request);
   Add("BareExchange/" + kind, BareExchange, bare);
 }

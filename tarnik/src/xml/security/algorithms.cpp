@@ -86,7 +86,7 @@ std::vector<std::string> SplitPrefixes(std::string_view list) {
   return prefixes;
 }
 
-// Exclusive XML Canonicalization, section 4.
+// Exclusive XML Canonicalization 1.0, section 4.
 std::vector<std::string> InclusivePrefixesOf(std::string_view algorithm,
                                              const ElementNode* element) {
   ContentReader content(element);

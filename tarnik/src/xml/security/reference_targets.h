@@ -7,7 +7,7 @@
 
 namespace Tarnik::Xml::Security {
 
-/// The target of each reference (XML Signature 1.1, section 4.4.3.2): the whole document for an
+/// The target of each reference (XML Signature 1.1, section 4.4.3.3): the whole document for an
 /// empty URI, else the only element with the id after the number sign. The document is the tree of
 /// `root`; ids in `signature` count even when it is not part of that tree yet.
 ///
