@@ -1,5 +1,8 @@
 #include "bare_client.h"
 
+#include <stdexcept>
+#include <utility>
+
 #include <boost/asio/io_context.hpp>
 #include <boost/asio/ip/tcp.hpp>
 #include <boost/asio/ssl.hpp>
@@ -8,8 +11,6 @@
 #include <boost/beast/http/parser.hpp>
 #include <boost/beast/http/read.hpp>
 #include <boost/beast/http/string_body.hpp>
-#include <stdexcept>
-#include <utility>
 
 namespace Bench {
 namespace {

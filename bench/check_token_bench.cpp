@@ -1,4 +1,5 @@
 #include <benchmark/benchmark.h>
+
 #include <ssoclient/saml_token.h>
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/xml/security/key_info_resolver.h>

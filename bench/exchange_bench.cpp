@@ -1,11 +1,12 @@
-#include <benchmark/benchmark.h>
-#include <ssoclient/ssoclient.h>
-#include <tarnik/http/http_url.h>
-
 #include <exception>
 #include <iostream>
 #include <memory>
 #include <string>
+
+#include <benchmark/benchmark.h>
+
+#include <ssoclient/ssoclient.h>
+#include <tarnik/http/http_url.h>
 
 #include "bare_client.h"
 #include "sts/request_builder.h"

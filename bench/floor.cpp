@@ -1,11 +1,11 @@
 #include "floor.h"
 
-#include <openssl/evp.h>
-#include <openssl/rsa.h>
-
 #include <array>
 #include <stdexcept>
 #include <vector>
+
+#include <openssl/evp.h>
+#include <openssl/rsa.h>
 
 namespace Bench {
 namespace {

@@ -1,13 +1,13 @@
 #include "peer.h"
 
+#include <stdexcept>
+
 #include <libxml/parser.h>
 #include <libxml/tree.h>
 #include <xmlsec/crypto.h>
 #include <xmlsec/xmldsig.h>
 #include <xmlsec/xmlsec.h>
 #include <xmlsec/xmltree.h>
-
-#include <stdexcept>
 
 namespace Bench {
 namespace {

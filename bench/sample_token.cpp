@@ -1,10 +1,10 @@
 #include "sample_token.h"
 
+#include <map>
+
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
 #include <tarnik/system/date_time.h>
-
-#include <map>
 
 namespace Bench {
 namespace {

@@ -1,8 +1,14 @@
+#include <array>
+#include <memory>
+#include <string>
+#include <vector>
+
 #include <benchmark/benchmark.h>
-#include <devsts/certificates.h>
 #include <openssl/evp.h>
 #include <openssl/pem.h>
 #include <openssl/rsa.h>
+
+#include <devsts/certificates.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/reader.h>
@@ -11,11 +17,6 @@
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/security/signature.h>
 #include <tarnik/xml/xml_parser.h>
-
-#include <array>
-#include <memory>
-#include <string>
-#include <vector>
 
 #include "sample_token.h"
 #include "sts/request_builder.h"

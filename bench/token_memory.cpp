@@ -1,11 +1,12 @@
 // Prints for each size of token: the requested size, the bytes of its text, and the bytes of heap
 // memory that one token uses, including the overhead of the allocator.
-#include <malloc.h>
-#include <ssoclient/saml_token.h>
-
 #include <cstdio>
 #include <memory>
 #include <vector>
+
+#include <malloc.h>
+
+#include <ssoclient/saml_token.h>
 
 #include "sample_token.h"
 

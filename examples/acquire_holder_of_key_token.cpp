@@ -1,11 +1,11 @@
 // Acquires a holder-of-key token by password and saves its text to a file. Without the private key,
 // the file is of no use to anyone.
-#include <ssoclient/ssoclient.h>
-
 #include <fstream>
 #include <iostream>
 #include <stdexcept>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 8) {

@@ -1,8 +1,8 @@
 // Acquires a bearer token by user name and password and prints its description.
-#include <ssoclient/ssoclient.h>
-
 #include <iostream>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 5) {

@@ -1,10 +1,10 @@
 // Acquires a bearer token by user name and password, asynchronously.
-#include <ssoclient/ssoclient.h>
-
 #include <future>
 #include <iostream>
 #include <memory>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 5) {

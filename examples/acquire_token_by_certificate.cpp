@@ -1,7 +1,7 @@
 // Acquires a token for the owner of a certificate. The request is signed with the private key.
-#include <ssoclient/ssoclient.h>
-
 #include <iostream>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 6) {

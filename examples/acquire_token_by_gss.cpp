@@ -1,9 +1,9 @@
 // Acquires a token by Kerberos: with the tickets in the process's default credential cache, or with
 // a keytab.
+#include <iostream>
+
 #include <ssoclient/gssapi_negotiation_handler.h>
 #include <ssoclient/ssoclient.h>
-
-#include <iostream>
 
 int main(int argc, char** argv) {
   if (argc != 5 && argc != 7) {

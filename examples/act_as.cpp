@@ -1,11 +1,11 @@
 // Acquires a token with which the owner of a certificate acts on behalf of a user. The user's own
 // token must be delegable.
-#include <ssoclient/ssoclient.h>
-
 #include <fstream>
 #include <iostream>
 #include <iterator>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 7) {

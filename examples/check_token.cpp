@@ -1,13 +1,13 @@
 // The receiving side: decides whether to accept a token that a peer presents. PEER_CERTIFICATE is
 // the certificate with which the peer proved its identity, for example in a TLS handshake.
-#include <ssoclient/ssoclient.h>
-
 #include <cstring>
 #include <fstream>
 #include <iostream>
 #include <iterator>
 #include <set>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 namespace {
 

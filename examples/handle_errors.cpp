@@ -1,8 +1,8 @@
 // Shows how to handle each kind of failure of a login.
-#include <ssoclient/ssoclient.h>
-
 #include <iostream>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 5) {

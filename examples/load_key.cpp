@@ -1,9 +1,9 @@
 // Loads a private key and its certificate from files or a device. The passphrase or PIN is read
 // only if the key needs one.
-#include <ssoclient/ssoclient.h>
-
 #include <iostream>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 namespace {
 

@@ -1,9 +1,9 @@
 // Sends the library's log lines, including the steps of each operation, to the server's own log.
-#include <ssoclient/ssoclient.h>
-#include <tarnik/service/log.h>
-
 #include <iostream>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
+#include <tarnik/service/log.h>
 
 int main(int argc, char** argv) {
   if (argc != 5) {

@@ -1,9 +1,9 @@
 // Acquires a token by Kerberos with one call per leg. This is for servers that relay the legs
 // between the service and a client that creates them.
+#include <iostream>
+
 #include <ssoclient/gssapi_negotiation_handler.h>
 #include <ssoclient/ssoclient.h>
-
-#include <iostream>
 
 int main(int argc, char** argv) {
   if (argc != 5) {

@@ -1,10 +1,10 @@
 // Renews a token that is renewable and bound to the key.
-#include <ssoclient/ssoclient.h>
-
 #include <fstream>
 #include <iostream>
 #include <iterator>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 7) {

@@ -1,10 +1,10 @@
 // Asks the service whether a token is still valid.
-#include <ssoclient/ssoclient.h>
-
 #include <fstream>
 #include <iostream>
 #include <iterator>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 5) {

@@ -1,11 +1,12 @@
 // Apart from white space, a text that can be decoded is the only encoding of its bytes. All bytes
 // can be encoded and decoded again. OpenSSL refuses every text that is refused here.
+#include <algorithm>
+
 #include <openssl/evp.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/text/base64.h>
 #include <tarnik/text/string_util.h>
-
-#include <algorithm>
 
 #include "input.h"
 

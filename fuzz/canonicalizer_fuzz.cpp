@@ -1,12 +1,12 @@
 // libxml2 accepts every text that the parser accepts, and returns the same canonical forms of the
 // document and of its first elements. The output of the writer is the same document.
+#include <optional>
+
 #include <tarnik/core/writer.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/security/canonicalizer.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 #include <tarnik/xml/xml_writer.h>
-
-#include <optional>
 
 #include "input.h"
 #include "support/libxml2_oracle.h"

@@ -1,10 +1,10 @@
 // Whatever a peer sets, the Cookie header returned to it is one clean line of bounded size that
 // contains only what the peer set, and no other host receives it. The lines of the input are
 // Set-Cookie headers of several answers.
-#include <tarnik/http/cookie_store.h>
-
 #include <algorithm>
 #include <sstream>
+
+#include <tarnik/http/cookie_store.h>
 
 #include "input.h"
 

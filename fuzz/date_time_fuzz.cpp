@@ -1,11 +1,12 @@
 // A date-time that can be read is also an xs:dateTime to libxml2, which orders two of them in the
 // same way. Printed and read again, it is the same instant.
-#include <libxml/xmlschemastypes.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/system/date_time.h>
-
 #include <memory>
 #include <optional>
+
+#include <libxml/xmlschemastypes.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/system/date_time.h>
 
 #include "input.h"
 

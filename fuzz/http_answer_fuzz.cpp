@@ -1,12 +1,12 @@
 // The result of parsing an answer does not depend on the size of the pieces or on bytes after the
 // answer. The body is shorter than the input, and an answer without its last byte is incomplete.
 // The first byte of the input is the size of the pieces.
-#include <tarnik/http/http_exception.h>
-
 #include <algorithm>
 #include <optional>
 #include <string>
 #include <string_view>
+
+#include <tarnik/http/http_exception.h>
 
 #include "http/response_parser.h"
 #include "input.h"

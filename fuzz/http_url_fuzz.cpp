@@ -1,12 +1,13 @@
 // The parts of an accepted URL can be used in a request, result in the same URL when they are put
 // together again, and are the parts that libxml2 finds.
-#include <libxml/uri.h>
-#include <strings.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/http/http_url.h>
-
 #include <algorithm>
 #include <memory>
+
+#include <libxml/uri.h>
+#include <strings.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/http/http_url.h>
 
 #include "input.h"
 

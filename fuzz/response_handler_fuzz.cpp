@@ -1,11 +1,11 @@
 // Each of the four parsers returns a result or throws one of the documented exceptions. A result is
 // the content that libxml2 finds at the same place, and its answer contains no fault.
+#include <initializer_list>
+#include <optional>
+
 #include <devsts/xml_security.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/reader.h>
-
-#include <initializer_list>
-#include <optional>
 
 #include "input.h"
 #include "sts/response_handler.h"

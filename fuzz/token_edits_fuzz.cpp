@@ -1,11 +1,12 @@
 // Every token that a resolver accepts has the signed values, and an independent verifier of XML
 // signatures accepts it too. The input determines how signed assertions are edited, not what they
 // contain.
+#include <optional>
+
 #include <fuzzer/FuzzedDataProvider.h>
+
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>
-
-#include <optional>
 
 #include "input.h"
 #include "support/assertion_text.h"

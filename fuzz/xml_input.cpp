@@ -1,10 +1,11 @@
 #include "xml_input.h"
 
-#include <libxml/uri.h>
-#include <tarnik/xml/xml_parse_exception.h>
-
 #include <memory>
 #include <string_view>
+
+#include <libxml/uri.h>
+
+#include <tarnik/xml/xml_parse_exception.h>
 
 #include "support/parse_xml.h"
 

@@ -1,5 +1,3 @@
-#include <cxxabi.h>
-
 #include <cstddef>
 #include <memory>
 #include <new>
@@ -7,7 +5,9 @@
 #include <typeinfo>
 #include <utility>
 
+#include <cxxabi.h>
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 

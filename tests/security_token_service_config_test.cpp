@@ -1,4 +1,5 @@
 #include <gtest/gtest.h>
+
 #include <ssoclient/holder_of_key_config.h>
 #include <ssoclient/saml_token_factory.h>
 #include <ssoclient/security_token_service_config.h>

@@ -1,9 +1,9 @@
 #ifndef DEVSTS_EXPECT_FAULT_H
 #define DEVSTS_EXPECT_FAULT_H
 
-#include <gmock/gmock.h>
-
 #include <string>
+
+#include <gmock/gmock.h>
 
 #include "request_text.h"
 

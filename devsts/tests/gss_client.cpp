@@ -1,9 +1,9 @@
 #include "gss_client.h"
 
+#include <stdexcept>
+
 #include <gssapi/gssapi_ext.h>
 #include <gssapi/gssapi_krb5.h>
-
-#include <stdexcept>
 
 namespace DevSts::Testing {
 namespace {

@@ -1,10 +1,10 @@
 #ifndef DEVSTS_GSS_CLIENT_H
 #define DEVSTS_GSS_CLIENT_H
 
-#include <gssapi/gssapi.h>
-
 #include <memory>
 #include <string>
+
+#include <gssapi/gssapi.h>
 
 namespace DevSts::Testing {
 

@@ -1,11 +1,11 @@
 // Tokens for requests that prove possession of a key.
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include <cstddef>
 #include <stdexcept>
 #include <string>
 #include <utility>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
 #include "devsts/server.h"
 #include "raw_client.h"

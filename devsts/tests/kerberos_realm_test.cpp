@@ -1,9 +1,5 @@
 #include "devsts/kerberos_realm.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <signal.h>
-
 #include <array>
 #include <cerrno>
 #include <chrono>
@@ -14,6 +10,10 @@
 #include <memory>
 #include <stdexcept>
 #include <string>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <signal.h>
 
 namespace DevSts::Testing {
 namespace {

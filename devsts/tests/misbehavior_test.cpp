@@ -1,14 +1,14 @@
 #include "devsts/misbehavior.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include <chrono>
 #include <cstddef>
 #include <memory>
 #include <stdexcept>
 #include <string>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
 #include "devsts/server.h"
 #include "raw_client.h"

@@ -1,10 +1,10 @@
 #include "negotiation_client.h"
 
-#include <openssl/evp.h>
-
 #include <algorithm>
 #include <atomic>
 #include <stdexcept>
+
+#include <openssl/evp.h>
 
 #include "raw_client.h"
 

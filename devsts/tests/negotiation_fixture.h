@@ -1,10 +1,10 @@
 #ifndef DEVSTS_NEGOTIATION_FIXTURE_H
 #define DEVSTS_NEGOTIATION_FIXTURE_H
 
-#include <gtest/gtest.h>
-
 #include <memory>
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "devsts/kerberos_realm.h"
 #include "devsts/server.h"

@@ -1,13 +1,13 @@
 // The rules for the requests of a negotiation, and the misbehaviour of the service.
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include <chrono>
 #include <cstddef>
 #include <memory>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
 #include "devsts/negotiation.h"
 #include "expect_fault.h"

@@ -1,15 +1,15 @@
 #include "devsts/negotiation.h"
 
-#include <gmock/gmock.h>
-#include <gssapi/gssapi_ext.h>
-#include <gtest/gtest.h>
-
 #include <array>
 #include <cstddef>
 #include <stdexcept>
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gssapi/gssapi_ext.h>
+#include <gtest/gtest.h>
 
 #include "expect_fault.h"
 #include "negotiation_fixture.h"

@@ -1,5 +1,9 @@
 #include "raw_client.h"
 
+#include <array>
+#include <cerrno>
+#include <stdexcept>
+
 #include <arpa/inet.h>
 #include <openssl/err.h>
 #include <openssl/pem.h>
@@ -7,10 +11,6 @@
 #include <poll.h>
 #include <sys/socket.h>
 #include <unistd.h>
-
-#include <array>
-#include <cerrno>
-#include <stdexcept>
 
 namespace DevSts::Testing {
 namespace {

@@ -1,14 +1,14 @@
 #ifndef DEVSTS_RAW_CLIENT_H
 #define DEVSTS_RAW_CLIENT_H
 
-#include <openssl/ssl.h>
-#include <openssl/x509_vfy.h>
-
 #include <chrono>
 #include <cstdint>
 #include <memory>
 #include <string>
 #include <string_view>
+
+#include <openssl/ssl.h>
+#include <openssl/x509_vfy.h>
 
 namespace DevSts::Testing {
 

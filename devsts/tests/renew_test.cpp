@@ -1,10 +1,10 @@
 // Renewal of tokens.
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include <cstddef>
 #include <cstring>
 #include <string>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
 #include "devsts/server.h"
 #include "expect_fault.h"

@@ -1,11 +1,11 @@
 // The signatures of requests as a whole: what they prove, and when they are required.
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include <chrono>
 #include <cstddef>
 #include <cstring>
 #include <string>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
 #include "devsts/server.h"
 #include "expect_fault.h"

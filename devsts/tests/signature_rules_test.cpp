@@ -1,8 +1,8 @@
 // The rules for a request's signature, each broken on its own.
+#include <string>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-
-#include <string>
 
 #include "devsts/server.h"
 #include "expect_fault.h"

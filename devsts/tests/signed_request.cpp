@@ -1,13 +1,13 @@
 #include "signed_request.h"
 
-#include <openssl/bio.h>
-#include <openssl/evp.h>
-#include <openssl/pem.h>
-
 #include <array>
 #include <memory>
 #include <stdexcept>
 #include <vector>
+
+#include <openssl/bio.h>
+#include <openssl/evp.h>
+#include <openssl/pem.h>
 
 #include "devsts/xml_security.h"
 #include "raw_client.h"

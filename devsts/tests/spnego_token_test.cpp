@@ -1,12 +1,12 @@
 // The parts of SPNEGO messages that the service reads itself, and its safety against malformed
 // ones.
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
+#include "kerberos/spnego_token.h"
 
 #include <cstddef>
 #include <functional>
 
-#include "kerberos/spnego_token.h"
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
 namespace DevSts::Testing {
 namespace {

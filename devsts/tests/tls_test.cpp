@@ -1,9 +1,9 @@
+#include <memory>
+#include <string>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <openssl/x509_vfy.h>
-
-#include <memory>
-#include <string>
 
 #include "devsts/server.h"
 #include "raw_client.h"

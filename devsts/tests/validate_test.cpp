@@ -1,9 +1,9 @@
 // The results of the Validate operation.
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include <cstddef>
 #include <string>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
 #include "devsts/server.h"
 #include "raw_client.h"

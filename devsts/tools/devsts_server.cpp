@@ -1,9 +1,5 @@
 // Runs the service until SIGTERM or SIGINT or, with --end-with-stdin, until the end of standard
 // input, which then contains commands.
-#include <poll.h>
-#include <sys/signalfd.h>
-#include <unistd.h>
-
 #include <array>
 #include <chrono>
 #include <csignal>
@@ -16,6 +12,10 @@
 #include <optional>
 #include <string>
 #include <string_view>
+
+#include <poll.h>
+#include <sys/signalfd.h>
+#include <unistd.h>
 
 #include "devsts/kerberos_realm.h"
 #include "devsts/server.h"

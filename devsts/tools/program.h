@@ -1,14 +1,14 @@
 #ifndef DEVSTS_PROGRAM_H
 #define DEVSTS_PROGRAM_H
 
-#include <fcntl.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
 #include <fstream>
 #include <sstream>
 #include <stdexcept>
 #include <string>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 namespace DevSts {
 

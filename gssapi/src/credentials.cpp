@@ -1,12 +1,13 @@
 #include "credentials.h"
 
+#include <vector>
+
 #include <gssapi/gssapi_ext.h>
 #include <gssapi/gssapi_krb5.h>
 #include <krb5.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/text/string_util.h>
-
-#include <vector>
 
 #include "errors.h"
 

@@ -1,9 +1,9 @@
 #ifndef SSOCLIENT_GSSAPI_CREDENTIALS_H
 #define SSOCLIENT_GSSAPI_CREDENTIALS_H
 
-#include <gssapi/gssapi.h>
-
 #include <string>
+
+#include <gssapi/gssapi.h>
 
 #include "handles.h"
 

@@ -1,8 +1,8 @@
 #include "errors.h"
 
-#include <ssoclient/exceptions.h>
-
 #include <cstddef>
+
+#include <ssoclient/exceptions.h>
 
 #include "handles.h"
 

@@ -1,10 +1,10 @@
 #ifndef SSOCLIENT_GSSAPI_ERRORS_H
 #define SSOCLIENT_GSSAPI_ERRORS_H
 
-#include <gssapi/gssapi.h>
-
 #include <string>
 #include <string_view>
+
+#include <gssapi/gssapi.h>
 
 namespace SsoClient {
 

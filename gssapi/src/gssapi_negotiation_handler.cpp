@@ -1,14 +1,13 @@
-#include <ssoclient/gssapi_negotiation_handler.h>
-
-#include <ssoclient/exceptions.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/text/string_util.h>
-
 #include <atomic>
 #include <memory>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <ssoclient/exceptions.h>
+#include <ssoclient/gssapi_negotiation_handler.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/text/string_util.h>
 
 #include "credentials.h"
 #include "errors.h"

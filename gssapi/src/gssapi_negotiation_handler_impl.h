@@ -1,13 +1,13 @@
 #ifndef SSOCLIENT_GSSAPI_GSSAPI_NEGOTIATION_HANDLER_IMPL_H
 #define SSOCLIENT_GSSAPI_GSSAPI_NEGOTIATION_HANDLER_IMPL_H
 
-#include <ssoclient/gssapi_negotiation_handler.h>
-
 #include <atomic>
 #include <memory>
 #include <optional>
 #include <string>
 #include <vector>
+
+#include <ssoclient/gssapi_negotiation_handler.h>
 
 #include "credentials.h"
 #include "handles.h"

@@ -1,12 +1,12 @@
 #ifndef SSOCLIENT_GSSAPI_HANDLES_H
 #define SSOCLIENT_GSSAPI_HANDLES_H
 
-#include <gssapi/gssapi.h>
-#include <krb5.h>
-
 #include <cstring>
 #include <memory>
 #include <type_traits>
+
+#include <gssapi/gssapi.h>
+#include <krb5.h>
 
 namespace SsoClient {
 

@@ -1,13 +1,14 @@
 #include "credentials.h"
 
-#include <gtest/gtest.h>
-#include <krb5.h>
-#include <ssoclient/exceptions.h>
-
 #include <chrono>
 #include <filesystem>
 #include <fstream>
 #include <string>
+
+#include <gtest/gtest.h>
+#include <krb5.h>
+
+#include <ssoclient/exceptions.h>
 
 #include "gss_acceptor.h"
 #include "gssapi_negotiation_handler_impl.h"

@@ -1,11 +1,12 @@
 #include "errors.h"
 
-#include <gssapi/gssapi.h>
-#include <gtest/gtest.h>
-#include <ssoclient/exceptions.h>
-
 #include <string>
 #include <string_view>
+
+#include <gssapi/gssapi.h>
+#include <gtest/gtest.h>
+
+#include <ssoclient/exceptions.h>
 
 #include "credentials.h"
 #include "handles.h"

@@ -2,6 +2,7 @@
 
 #include <gssapi/gssapi_ext.h>
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 
 #include "errors.h"

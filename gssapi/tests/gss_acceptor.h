@@ -1,11 +1,12 @@
 #ifndef SSOCLIENT_GSSAPI_TESTS_GSS_ACCEPTOR_H
 #define SSOCLIENT_GSSAPI_TESTS_GSS_ACCEPTOR_H
 
-#include <gssapi/gssapi.h>
-#include <ssoclient/gssapi_negotiation_handler.h>
-
 #include <string>
 #include <vector>
+
+#include <gssapi/gssapi.h>
+
+#include <ssoclient/gssapi_negotiation_handler.h>
 
 #include "handles.h"
 

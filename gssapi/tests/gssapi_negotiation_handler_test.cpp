@@ -1,12 +1,3 @@
-#include <ssoclient/gssapi_negotiation_handler.h>
-
-#include <gmock/gmock.h>
-#include <gssapi/gssapi.h>
-#include <gtest/gtest.h>
-#include <ssoclient/exceptions.h>
-#include <sys/socket.h>
-#include <tarnik/core/exception.h>
-
 #include <chrono>
 #include <cstddef>
 #include <filesystem>
@@ -15,6 +6,15 @@
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gssapi/gssapi.h>
+#include <gtest/gtest.h>
+#include <sys/socket.h>
+
+#include <ssoclient/exceptions.h>
+#include <ssoclient/gssapi_negotiation_handler.h>
+#include <tarnik/core/exception.h>
 
 #include "calls/freed_memory.h"
 #include "gss_acceptor.h"

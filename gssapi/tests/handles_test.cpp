@@ -1,11 +1,11 @@
 #include "handles.h"
 
-#include <gssapi/gssapi.h>
-#include <gtest/gtest.h>
-
 #include <cstdlib>
 #include <cstring>
 #include <string>
+
+#include <gssapi/gssapi.h>
+#include <gtest/gtest.h>
 
 #include "replaced_calls.h"
 

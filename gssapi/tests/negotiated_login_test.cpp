@@ -1,17 +1,17 @@
 // The handler in the two places that exchange legs, with a service that accepts Kerberos.
-#include <ssoclient/gssapi_negotiation_handler.h>
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <ssoclient/exceptions.h>
-#include <tarnik/text/string_util.h>
-
-#include <boost/none.hpp>
 #include <memory>
 #include <string>
 #include <string_view>
 #include <utility>
 #include <vector>
+
+#include <boost/none.hpp>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <ssoclient/exceptions.h>
+#include <ssoclient/gssapi_negotiation_handler.h>
+#include <tarnik/text/string_util.h>
 
 #include "gss_acceptor.h"
 #include "realm_fixture.h"

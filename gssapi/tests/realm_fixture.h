@@ -1,12 +1,13 @@
 #ifndef SSOCLIENT_GSSAPI_TESTS_REALM_FIXTURE_H
 #define SSOCLIENT_GSSAPI_TESTS_REALM_FIXTURE_H
 
-#include <devsts/kerberos_realm.h>
-#include <gtest/gtest.h>
-#include <ssoclient/gssapi_negotiation_handler.h>
-
 #include <memory>
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include <devsts/kerberos_realm.h>
+#include <ssoclient/gssapi_negotiation_handler.h>
 
 namespace SsoClient::Testing {
 

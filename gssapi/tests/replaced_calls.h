@@ -1,10 +1,10 @@
 #ifndef SSOCLIENT_GSSAPI_TESTS_REPLACED_CALLS_H
 #define SSOCLIENT_GSSAPI_TESTS_REPLACED_CALLS_H
 
-#include <gssapi/gssapi.h>
-
 #include <functional>
 #include <string>
+
+#include <gssapi/gssapi.h>
 
 namespace SsoClient::Testing {
 

@@ -1,14 +1,14 @@
 #include "talkative_kdc.h"
 
+#include <cstdint>
+#include <stdexcept>
+#include <utility>
+
 #include <arpa/inet.h>
 #include <gtest/gtest.h>
 #include <krb5.h>
 #include <sys/socket.h>
 #include <unistd.h>
-
-#include <cstdint>
-#include <stdexcept>
-#include <utility>
 
 #include "handles.h"
 

@@ -1,12 +1,13 @@
 #ifndef SSOCLIENT_TOKEN_SPEC_H
 #define SSOCLIENT_TOKEN_SPEC_H
 
-#include <boost/optional.hpp>
 #include <cstdint>
 #include <memory>
 #include <set>
 #include <string>
 #include <vector>
+
+#include <boost/optional.hpp>
 
 #include <ssoclient/advice.h>
 #include <ssoclient/confirmation_type.h>

@@ -2,6 +2,7 @@
 #include <functional>
 
 #include <gmock/gmock.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/ref.h>

@@ -1,7 +1,5 @@
 #include "calls/freed_memory.h"
 
-#include <malloc.h>
-
 #include <atomic>
 #include <cstddef>
 #include <cstdlib>
@@ -9,6 +7,8 @@
 #include <new>
 #include <string>
 #include <utility>
+
+#include <malloc.h>
 
 namespace SsoClient::Testing {
 

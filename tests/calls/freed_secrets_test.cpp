@@ -4,11 +4,12 @@
 #include <string>
 #include <vector>
 
+#include <boost/none.hpp>
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/negotiation_handler.h>
 #include <tarnik/text/string_util.h>
-#include <boost/none.hpp>
 
 #include "calls/freed_memory.h"
 #include "sts/answers.h"

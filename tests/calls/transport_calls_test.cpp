@@ -1,10 +1,9 @@
 // How the transport uses the platform, and the limits that each of its users sets.
-#include "transport/https_client.h"
-
 #include <memory>
 #include <string>
 
 #include <gmock/gmock.h>
+
 #include <ssoclient/gss_negotiation_context.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/security_token_service_config.h>
@@ -19,6 +18,7 @@
 #include "calls/recorded_calls.h"
 #include "sts/fakes.h"
 #include "transport/fake_ssl.h"
+#include "transport/https_client.h"
 #include "transport/read_all.h"
 
 namespace SsoClient::Testing {

@@ -1,8 +1,8 @@
-#include <ssoclient/gssapi_negotiation_handler.h>
-#include <ssoclient/ssoclient.h>
-
 #include <iostream>
 #include <string>
+
+#include <ssoclient/gssapi_negotiation_handler.h>
+#include <ssoclient/ssoclient.h>
 
 namespace {
 

@@ -1,7 +1,7 @@
-#include <ssoclient/ssoclient.h>
-
 #include <iostream>
 #include <string>
+
+#include <ssoclient/ssoclient.h>
 
 namespace {
 

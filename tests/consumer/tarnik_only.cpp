@@ -1,9 +1,9 @@
+#include <iostream>
+
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/reader.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/xml_parser.h>
-
-#include <iostream>
 
 int main() {
   const auto reader = Tarnik::CreateStringReader("<a><b/></a>");

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>

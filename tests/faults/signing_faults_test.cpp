@@ -2,9 +2,10 @@
 #include <new>
 #include <string>
 
+#include <gtest/gtest.h>
+
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
-#include <gtest/gtest.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/xml/element_node.h>

@@ -4,6 +4,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/ref.h>

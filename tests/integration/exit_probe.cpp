@@ -1,9 +1,9 @@
 // Ends while calls are under way: exit_probe URL CA_FILE SIGNING_CERTIFICATE_FILE MICROSECONDS
-#include <ssoclient/ssoclient.h>
-
 #include <chrono>
 #include <cstdlib>
 #include <thread>
+
+#include <ssoclient/ssoclient.h>
 
 int main(int argc, char** argv) {
   if (argc != 5) {

@@ -17,6 +17,7 @@
 #include <vector>
 
 #include <gmock/gmock.h>
+
 #include <tarnik/crypto/crypto_exception.h>
 
 #include "integration/holder_of_key_fixture.h"

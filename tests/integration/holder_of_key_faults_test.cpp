@@ -7,8 +7,9 @@
 #include <typeinfo>
 #include <utility>
 
-#include <devsts/xml_security.h>
 #include <gmock/gmock.h>
+
+#include <devsts/xml_security.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"

@@ -3,6 +3,7 @@
 #include <vector>
 
 #include <gmock/gmock.h>
+
 #include <tarnik/service/log.h>
 
 #include "integration/sts_fixture.h"

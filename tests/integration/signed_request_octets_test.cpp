@@ -6,8 +6,9 @@
 #include <tuple>
 #include <vector>
 
-#include <devsts/xml_security.h>
 #include <gmock/gmock.h>
+
+#include <devsts/xml_security.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"

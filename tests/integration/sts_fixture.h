@@ -5,12 +5,13 @@
 #include <string>
 #include <typeinfo>
 
-#include <devsts/server.h>
-#include <gtest/gtest.h>
-#include <ssoclient/ssoclient.h>
-#include <tarnik/crypto/certificate.h>
 #include <boost/none.hpp>
 #include <boost/optional.hpp>
+#include <gtest/gtest.h>
+
+#include <devsts/server.h>
+#include <ssoclient/ssoclient.h>
+#include <tarnik/crypto/certificate.h>
 
 namespace SsoClient::Testing {
 

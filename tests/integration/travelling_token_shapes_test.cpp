@@ -3,8 +3,9 @@
 #include <string>
 #include <utility>
 
-#include <devsts/xml_security.h>
 #include <gtest/gtest.h>
+
+#include <devsts/xml_security.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"

@@ -11,6 +11,7 @@
 #include <vector>
 
 #include <gmock/gmock.h>
+
 #include <tarnik/core/object_impl.h>
 #include <tarnik/http/http_user_agent.h>
 #include <tarnik/ssl/ssl_context.h>

@@ -2,8 +2,9 @@
 #include <chrono>
 #include <string>
 
-#include <devsts/xml_security.h>
 #include <gmock/gmock.h>
+
+#include <devsts/xml_security.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/text_edits.h"

@@ -4,9 +4,10 @@
 #include <memory>
 #include <vector>
 
+#include <gtest/gtest.h>
+
 #include <devsts/kerberos_realm.h>
 #include <devsts/server.h>
-#include <gtest/gtest.h>
 #include <ssoclient/gssapi_negotiation_handler.h>
 #include <ssoclient/ssoclient.h>
 

@@ -3,6 +3,7 @@
 #include <limits>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/system/date_time.h>
 
 namespace SsoClient::Testing {

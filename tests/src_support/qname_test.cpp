@@ -1,6 +1,7 @@
 #include "support/qname.h"
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 
 #include "support/parse_xml.h"

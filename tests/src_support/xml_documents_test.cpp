@@ -1,6 +1,7 @@
 #include "support/xml_documents.h"
 
 #include <gtest/gtest.h>
+
 #include <tarnik/core/reader.h>
 #include <tarnik/xml/xml_parse_exception.h>
 

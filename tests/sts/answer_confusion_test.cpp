@@ -1,15 +1,15 @@
-#include "sts/response_handler.h"
-
 #include <functional>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include <gmock/gmock.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/reader.h>
 
 #include "sts/answers.h"
+#include "sts/response_handler.h"
 
 // Answers of one operation given to another.
 namespace SsoClient::Testing {

@@ -1,5 +1,3 @@
-#include "sts/response_handler.h"
-
 #include <cstddef>
 #include <string>
 #include <tuple>
@@ -7,12 +5,14 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/reader.h>
 #include <tarnik/xml/security/key_info_resolver.h>
 
 #include "sts/answers.h"
+#include "sts/response_handler.h"
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
 

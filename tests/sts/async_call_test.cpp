@@ -12,6 +12,7 @@
 #include <utility>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 

@@ -1,8 +1,9 @@
 #include <memory>
 #include <string>
 
-#include <devsts/xml_security.h>
 #include <gmock/gmock.h>
+
+#include <devsts/xml_security.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/security_token_service_config.h>
 #include <tarnik/core/exception.h>

@@ -6,10 +6,11 @@
 #include <utility>
 #include <vector>
 
-#include <ssoclient/holder_of_key_config.h>
-#include <ssoclient/security_token_service.h>
 #include <boost/none.hpp>
 #include <boost/optional.hpp>
+
+#include <ssoclient/holder_of_key_config.h>
+#include <ssoclient/security_token_service.h>
 
 #include "sts/fakes.h"
 #include "sts/request_builder.h"

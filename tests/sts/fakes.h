@@ -11,6 +11,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/saml_token_factory.h>

@@ -6,8 +6,10 @@
 #include <utility>
 #include <vector>
 
-#include <devsts/certificates.h>
+#include <boost/none.hpp>
 #include <gmock/gmock.h>
+
+#include <devsts/certificates.h>
 #include <ssoclient/holder_of_key_config.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
@@ -15,7 +17,6 @@
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/system/date_time.h>
-#include <boost/none.hpp>
 
 #include "support/holder_of_key.h"
 #include "support/thrown_message.h"

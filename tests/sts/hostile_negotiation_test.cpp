@@ -5,11 +5,12 @@
 #include <utility>
 #include <vector>
 
+#include <boost/none.hpp>
 #include <gmock/gmock.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/negotiation_handler.h>
 #include <tarnik/text/string_util.h>
-#include <boost/none.hpp>
 
 #include "sts/answers.h"
 #include "sts/fakes.h"

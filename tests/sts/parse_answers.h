@@ -6,6 +6,7 @@
 #include <typeinfo>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/reader.h>
 

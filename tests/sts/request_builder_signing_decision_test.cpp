@@ -1,14 +1,14 @@
-#include "sts/request_builder.h"
-
 #include <string>
 #include <vector>
 
-#include <devsts/xml_security.h>
+#include <boost/none.hpp>
 #include <gtest/gtest.h>
+
+#include <devsts/xml_security.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
-#include <boost/none.hpp>
 
+#include "sts/request_builder.h"
 #include "sts/request_operations.h"
 #include "support/thrown_message.h"
 

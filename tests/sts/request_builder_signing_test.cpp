@@ -1,5 +1,3 @@
-#include "sts/request_builder.h"
-
 #include <chrono>
 #include <cstdint>
 #include <memory>
@@ -7,16 +5,18 @@
 #include <string>
 #include <vector>
 
+#include <boost/none.hpp>
+#include <gmock/gmock.h>
+
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
-#include <gmock/gmock.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/element_node.h>
 #include <tarnik/xml/xml_parse_exception.h>
-#include <boost/none.hpp>
 
+#include "sts/request_builder.h"
 #include "sts/request_operations.h"
 #include "support/fake_saml_token.h"
 #include "support/holder_of_key.h"

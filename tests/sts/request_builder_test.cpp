@@ -7,11 +7,12 @@
 #include <ostream>
 #include <string>
 
-#include <devsts/xml_security.h>
+#include <boost/none.hpp>
 #include <gmock/gmock.h>
+
+#include <devsts/xml_security.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
-#include <boost/none.hpp>
 
 #include "sts/request_operations.h"
 #include "support/fake_saml_token.h"

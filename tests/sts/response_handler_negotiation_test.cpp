@@ -1,12 +1,12 @@
-#include "sts/response_handler.h"
-
 #include <string>
 
 #include <gmock/gmock.h>
+
 #include <tarnik/core/reader.h>
 
 #include "sts/answers.h"
 #include "sts/parse_answers.h"
+#include "sts/response_handler.h"
 
 namespace SsoClient::Testing {
 namespace {

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include <gmock/gmock.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>

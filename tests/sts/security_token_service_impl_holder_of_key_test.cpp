@@ -10,13 +10,14 @@
 #include <typeinfo>
 #include <vector>
 
+#include <boost/optional.hpp>
 #include <gmock/gmock.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
-#include <boost/optional.hpp>
 
 #include "describe/describe.h"
 #include "sts/answers.h"

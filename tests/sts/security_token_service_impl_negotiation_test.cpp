@@ -7,6 +7,7 @@
 #include <vector>
 
 #include <gmock/gmock.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/negotiation_handler.h>
 #include <ssoclient/saml_token.h>

@@ -4,14 +4,15 @@
 #include <string>
 #include <typeinfo>
 
+#include <boost/none.hpp>
 #include <gmock/gmock.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/reader.h>
-#include <boost/none.hpp>
 
 #include "describe/describe.h"
 #include "sts/answers.h"

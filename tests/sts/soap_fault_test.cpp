@@ -4,6 +4,7 @@
 #include <typeinfo>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 

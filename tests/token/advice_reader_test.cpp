@@ -5,6 +5,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 
 #include "support/fragment.h"

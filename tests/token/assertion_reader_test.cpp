@@ -7,6 +7,7 @@
 #include <utility>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/system/date_time.h>
 

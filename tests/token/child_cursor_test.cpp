@@ -4,6 +4,7 @@
 #include <string>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/xml/character_nodes.h>

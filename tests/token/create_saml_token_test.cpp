@@ -4,9 +4,10 @@
 #include <thread>
 #include <vector>
 
+#include <gtest/gtest.h>
+
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
-#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>

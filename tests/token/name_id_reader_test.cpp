@@ -4,6 +4,7 @@
 #include <utility>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/principal_id.h>
 

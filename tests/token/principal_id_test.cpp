@@ -1,11 +1,11 @@
-#include <sys/mman.h>
-#include <unistd.h>
-
 #include <cstddef>
 #include <new>
 #include <string>
 
 #include <gtest/gtest.h>
+#include <sys/mman.h>
+#include <unistd.h>
+
 #include <ssoclient/principal_id.h>
 
 namespace SsoClient::Testing {

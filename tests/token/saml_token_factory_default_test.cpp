@@ -4,6 +4,7 @@
 #include <string>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/saml_token_factory.h>

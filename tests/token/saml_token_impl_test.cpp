@@ -9,6 +9,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/ref.h>

@@ -1,17 +1,19 @@
+#include "support/second_opinion.h"
+
 #include <chrono>
 #include <cstddef>
 #include <optional>
 #include <random>
 #include <string>
 
-#include <devsts/xml_security.h>
 #include <gtest/gtest.h>
+
+#include <devsts/xml_security.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>
 
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
-#include "support/second_opinion.h"
 #include "support/token_editor.h"
 #include "support/token_values.h"
 

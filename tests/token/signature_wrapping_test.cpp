@@ -3,6 +3,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>

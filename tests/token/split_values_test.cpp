@@ -2,9 +2,10 @@
 #include <ostream>
 #include <string>
 
+#include <gtest/gtest.h>
+
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
-#include <gtest/gtest.h>
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/principal_id.h>
 #include <tarnik/xml/character_nodes.h>

@@ -5,6 +5,7 @@
 #include <utility>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/certificate.h>

@@ -1,7 +1,8 @@
 #include <string>
 
-#include <devsts/xml_security.h>
 #include <gtest/gtest.h>
+
+#include <devsts/xml_security.h>
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 

@@ -6,6 +6,7 @@
 #include <string>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/xml/security/key_info_resolver.h>

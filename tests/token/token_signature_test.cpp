@@ -8,6 +8,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>

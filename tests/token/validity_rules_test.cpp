@@ -5,6 +5,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/principal_id.h>
 #include <tarnik/system/date_time.h>

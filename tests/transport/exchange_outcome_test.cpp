@@ -1,6 +1,7 @@
 #include "transport/exchange_outcome.h"
 
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 

@@ -5,6 +5,7 @@
 #include <type_traits>
 
 #include <gmock/gmock.h>
+
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>

@@ -1,5 +1,3 @@
-#include "transport/https_client.h"
-
 #include <atomic>
 #include <chrono>
 #include <future>
@@ -8,8 +6,9 @@
 #include <tuple>
 #include <typeinfo>
 
-#include <devsts/server.h>
 #include <gmock/gmock.h>
+
+#include <devsts/server.h>
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/reader.h>
@@ -18,6 +17,7 @@
 #include <tarnik/http/http_user_agent.h>
 #include <tarnik/ssl/ssl_context.h>
 
+#include "transport/https_client.h"
 #include "transport/loopback_server.h"
 #include "transport/read_all.h"
 

@@ -1,11 +1,6 @@
 #ifndef SSOCLIENT_TESTS_TRANSPORT_LOOPBACK_SERVER_H
 #define SSOCLIENT_TESTS_TRANSPORT_LOOPBACK_SERVER_H
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
 #include <cstddef>
 #include <cstring>
 #include <functional>
@@ -15,6 +10,11 @@
 #include <thread>
 #include <utility>
 #include <vector>
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <sys/socket.h>
+#include <unistd.h>
 
 namespace SsoClient::Testing {
 

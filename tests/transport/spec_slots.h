@@ -6,6 +6,7 @@
 #include <type_traits>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/core/ref.h>
 #include <tarnik/core/weak_linkable_impl.h>
 #include <tarnik/http/connection_spec.h>

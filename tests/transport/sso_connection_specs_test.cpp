@@ -6,6 +6,7 @@
 #include <string>
 
 #include <gmock/gmock.h>
+
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/http/connection_spec.h>

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include <gmock/gmock.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/xml/character_nodes.h>

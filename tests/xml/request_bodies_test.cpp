@@ -8,6 +8,7 @@
 #include <vector>
 
 #include <gmock/gmock.h>
+
 #include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>

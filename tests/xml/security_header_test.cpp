@@ -4,6 +4,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/system/date_time.h>
 #include <tarnik/text/string_util.h>
 

@@ -8,9 +8,10 @@
 #include <string_view>
 #include <vector>
 
+#include <gmock/gmock.h>
+
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
-#include <gmock/gmock.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/xml/element_node.h>

@@ -4,6 +4,7 @@
 #include <limits>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/system/date_time.h>
 
 #include "support/local_zone.h"

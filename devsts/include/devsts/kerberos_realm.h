@@ -1,11 +1,11 @@
 #ifndef DEVSTS_KERBEROS_REALM_H
 #define DEVSTS_KERBEROS_REALM_H
 
-#include <sys/types.h>
-
 #include <chrono>
 #include <memory>
 #include <string>
+
+#include <sys/types.h>
 
 namespace DevSts {
 

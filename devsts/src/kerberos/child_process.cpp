@@ -1,11 +1,5 @@
 #include "kerberos/child_process.h"
 
-#include <fcntl.h>
-#include <signal.h>
-#include <sys/prctl.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
 #include <cerrno>
 #include <chrono>
 #include <cstdio>
@@ -15,6 +9,12 @@
 #include <memory>
 #include <stdexcept>
 #include <thread>
+
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/prctl.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 namespace DevSts {
 

@@ -1,10 +1,10 @@
 #ifndef DEVSTS_KERBEROS_CHILD_PROCESS_H
 #define DEVSTS_KERBEROS_CHILD_PROCESS_H
 
-#include <sys/types.h>
-
 #include <string>
 #include <vector>
+
+#include <sys/types.h>
 
 namespace DevSts {
 

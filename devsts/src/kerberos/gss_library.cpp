@@ -1,7 +1,5 @@
 #include "kerberos/gss_library.h"
 
-#include "kerberos/gss_library.h"
-
 namespace DevSts {
 namespace {
 

@@ -1,11 +1,11 @@
 #ifndef DEVSTS_KERBEROS_GSS_LIBRARY_H
 #define DEVSTS_KERBEROS_GSS_LIBRARY_H
 
-#include <gssapi/gssapi.h>
-
 #include <stdexcept>
 #include <string>
 #include <utility>
+
+#include <gssapi/gssapi.h>
 
 #include "xml/schema_values.h"
 

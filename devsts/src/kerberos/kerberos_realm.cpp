@@ -1,8 +1,3 @@
-#include <devsts/kerberos_realm.h>
-
-#include <boost/asio/io_context.hpp>
-#include <boost/asio/ip/tcp.hpp>
-
 #include <chrono>
 #include <filesystem>
 #include <fstream>
@@ -11,6 +6,11 @@
 #include <thread>
 #include <utility>
 #include <vector>
+
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/ip/tcp.hpp>
+
+#include <devsts/kerberos_realm.h>
 
 #include "kerberos/child_process.h"
 

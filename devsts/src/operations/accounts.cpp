@@ -1,9 +1,9 @@
 #include "operations/accounts.h"
 
-#include <openssl/crypto.h>
-
 #include <algorithm>
 #include <utility>
+
+#include <openssl/crypto.h>
 
 #include "devsts/users.h"
 #include "signing/certificates.h"

@@ -1,9 +1,9 @@
 #include "operations/negotiation_store.h"
 
-#include <openssl/crypto.h>
-
 #include <algorithm>
 #include <utility>
+
+#include <openssl/crypto.h>
 
 #include "soap/fault.h"
 

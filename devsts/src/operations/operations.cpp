@@ -1,11 +1,11 @@
 #include "operations/operations.h"
 
-#include <openssl/rand.h>
-
 #include <algorithm>
 #include <array>
 #include <cstdio>
 #include <utility>
+
+#include <openssl/rand.h>
 
 #include "signing/openssl_handles.h"
 #include "soap/fault.h"

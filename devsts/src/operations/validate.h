@@ -1,10 +1,10 @@
 #ifndef DEVSTS_OPERATIONS_VALIDATE_H
 #define DEVSTS_OPERATIONS_VALIDATE_H
 
-#include <libxml/tree.h>
-
 #include <optional>
 #include <string>
+
+#include <libxml/tree.h>
 
 #include "operations/operations.h"
 #include "operations/token_store.h"

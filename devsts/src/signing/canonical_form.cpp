@@ -1,9 +1,9 @@
 #include "signing/canonical_form.h"
 
+#include <memory>
+
 #include <libxml/c14n.h>
 #include <libxml/xpath.h>
-
-#include <memory>
 
 #include "signing/openssl_handles.h"
 #include "xml/document.h"

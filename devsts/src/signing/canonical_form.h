@@ -1,10 +1,10 @@
 #ifndef DEVSTS_SIGNING_CANONICAL_FORM_H
 #define DEVSTS_SIGNING_CANONICAL_FORM_H
 
-#include <libxml/tree.h>
-
 #include <string>
 #include <vector>
+
+#include <libxml/tree.h>
 
 #include "devsts/xml_security.h"
 

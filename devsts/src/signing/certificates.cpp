@@ -1,14 +1,14 @@
 #include "signing/certificates.h"
 
-#include <arpa/inet.h>
-#include <openssl/rand.h>
-
 #include <array>
 #include <map>
 #include <memory>
 #include <mutex>
 #include <stdexcept>
 #include <utility>
+
+#include <arpa/inet.h>
+#include <openssl/rand.h>
 
 #include "signing/openssl_handles.h"
 #include "xml/schema_values.h"

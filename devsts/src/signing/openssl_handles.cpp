@@ -1,10 +1,10 @@
 #include "signing/openssl_handles.h"
 
-#include <openssl/err.h>
-#include <openssl/pem.h>
-
 #include <array>
 #include <stdexcept>
+
+#include <openssl/err.h>
+#include <openssl/pem.h>
 
 namespace DevSts {
 namespace {

@@ -1,14 +1,14 @@
 #ifndef DEVSTS_SIGNING_OPENSSL_HANDLES_H
 #define DEVSTS_SIGNING_OPENSSL_HANDLES_H
 
+#include <memory>
+#include <string>
+#include <string_view>
+
 #include <openssl/bio.h>
 #include <openssl/evp.h>
 #include <openssl/ssl.h>
 #include <openssl/x509v3.h>
-
-#include <memory>
-#include <string>
-#include <string_view>
 
 namespace DevSts {
 

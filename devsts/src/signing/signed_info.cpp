@@ -1,9 +1,9 @@
 #include "signing/signed_info.h"
 
-#include <openssl/rsa.h>
-
 #include <sstream>
 #include <vector>
+
+#include <openssl/rsa.h>
 
 #include "signing/algorithms.h"
 #include "signing/canonical_form.h"

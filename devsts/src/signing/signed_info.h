@@ -1,10 +1,10 @@
 #ifndef DEVSTS_SIGNING_SIGNED_INFO_H
 #define DEVSTS_SIGNING_SIGNED_INFO_H
 
-#include <libxml/tree.h>
-
 #include <string>
 #include <string_view>
+
+#include <libxml/tree.h>
 
 namespace DevSts {
 

@@ -1,12 +1,12 @@
 #include "signing/xml_signature.h"
 
+#include <functional>
+#include <memory>
+
 #include <xmlsec/openssl/app.h>
 #include <xmlsec/openssl/evp.h>
 #include <xmlsec/openssl/x509.h>
 #include <xmlsec/xmldsig.h>
-
-#include <functional>
-#include <memory>
 
 #include "signing/algorithms.h"
 #include "signing/openssl_handles.h"

@@ -1,9 +1,9 @@
 #ifndef DEVSTS_SIGNING_XML_SIGNATURE_H
 #define DEVSTS_SIGNING_XML_SIGNATURE_H
 
-#include <libxml/tree.h>
-
 #include <string_view>
+
+#include <libxml/tree.h>
 
 #include "devsts/xml_security.h"
 

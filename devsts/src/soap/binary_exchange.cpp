@@ -1,8 +1,8 @@
 #include "soap/binary_exchange.h"
 
-#include <libxml/uri.h>
-
 #include <memory>
+
+#include <libxml/uri.h>
 
 #include "devsts/xml_security.h"
 #include "soap/element_reader.h"

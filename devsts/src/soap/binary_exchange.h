@@ -1,9 +1,9 @@
 #ifndef DEVSTS_SOAP_BINARY_EXCHANGE_H
 #define DEVSTS_SOAP_BINARY_EXCHANGE_H
 
-#include <libxml/tree.h>
-
 #include <string>
+
+#include <libxml/tree.h>
 
 #include "xml/schema_values.h"
 

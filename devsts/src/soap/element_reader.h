@@ -1,12 +1,12 @@
 #ifndef DEVSTS_SOAP_ELEMENT_READER_H
 #define DEVSTS_SOAP_ELEMENT_READER_H
 
-#include <libxml/tree.h>
-
 #include <cstddef>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <libxml/tree.h>
 
 #include "xml/schema_values.h"
 

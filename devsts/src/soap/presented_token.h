@@ -1,11 +1,11 @@
 #ifndef DEVSTS_SOAP_PRESENTED_TOKEN_H
 #define DEVSTS_SOAP_PRESENTED_TOKEN_H
 
-#include <libxml/tree.h>
-
 #include <optional>
 #include <string>
 #include <vector>
+
+#include <libxml/tree.h>
 
 #include "soap/assertion_writer.h"
 

@@ -1,10 +1,10 @@
 #ifndef DEVSTS_SOAP_SECURITY_HEADER_H
 #define DEVSTS_SOAP_SECURITY_HEADER_H
 
-#include <libxml/tree.h>
-
 #include <optional>
 #include <string>
+
+#include <libxml/tree.h>
 
 #include "xml/schema_values.h"
 

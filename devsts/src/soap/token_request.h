@@ -1,13 +1,13 @@
 #ifndef DEVSTS_SOAP_TOKEN_REQUEST_H
 #define DEVSTS_SOAP_TOKEN_REQUEST_H
 
-#include <libxml/tree.h>
-
 #include <chrono>
 #include <optional>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <libxml/tree.h>
 
 #include "soap/binary_exchange.h"
 #include "xml/schema_values.h"

@@ -1,13 +1,13 @@
 #include "wire/connection.h"
 
+#include <algorithm>
+#include <array>
+#include <limits>
+
 #include <openssl/err.h>
 #include <poll.h>
 #include <sys/socket.h>
 #include <unistd.h>
-
-#include <algorithm>
-#include <array>
-#include <limits>
 
 namespace DevSts {
 namespace {

@@ -1,11 +1,11 @@
 #include "wire/connection_threads.h"
 
-#include <pthread.h>
-#include <unistd.h>
-
 #include <csignal>
 #include <exception>
 #include <utility>
+
+#include <pthread.h>
+#include <unistd.h>
 
 namespace DevSts {
 namespace {

@@ -1,12 +1,12 @@
 #include "wire/http_reader.h"
 
-#include <strings.h>
-
 #include <algorithm>
 #include <array>
+
 #include <boost/asio/buffer.hpp>
 #include <boost/beast/http/parser.hpp>
 #include <boost/beast/http/string_body.hpp>
+#include <strings.h>
 
 #include "devsts/server.h"
 

@@ -1,15 +1,15 @@
 #include "wire/listener.h"
 
+#include <cerrno>
+#include <memory>
+#include <stdexcept>
+#include <system_error>
+
 #include <netdb.h>
 #include <netinet/in.h>
 #include <netinet/tcp.h>
 #include <sys/socket.h>
 #include <unistd.h>
-
-#include <cerrno>
-#include <memory>
-#include <stdexcept>
-#include <system_error>
 
 #include "signing/openssl_handles.h"
 

@@ -1,11 +1,11 @@
 #include "wire/wire_answer.h"
 
-#include <strings.h>
-
 #include <algorithm>
 #include <array>
 #include <cstdio>
 #include <utility>
+
+#include <strings.h>
 
 namespace DevSts {
 namespace {

@@ -1,15 +1,14 @@
 #include "xml/document.h"
 
+#include <mutex>
+#include <utility>
+
 #include <libxml/valid.h>
 #include <libxml/xmlerror.h>
-#include <xmlsec/xmlsec.h>
-
 #include <xmlsec/errors.h>
 #include <xmlsec/openssl/app.h>
 #include <xmlsec/openssl/crypto.h>
-
-#include <mutex>
-#include <utility>
+#include <xmlsec/xmlsec.h>
 
 #include "devsts/xml_security.h"
 #include "xml/namespaces.h"

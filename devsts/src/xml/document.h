@@ -1,14 +1,14 @@
 #ifndef DEVSTS_XML_DOCUMENT_H
 #define DEVSTS_XML_DOCUMENT_H
 
-#include <libxml/parser.h>
-#include <libxml/tree.h>
-#include <libxml/xpath.h>
-
 #include <memory>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include <libxml/parser.h>
+#include <libxml/tree.h>
+#include <libxml/xpath.h>
 
 namespace DevSts {
 

@@ -1,11 +1,11 @@
 #include "xml/schema_values.h"
 
-#include <openssl/evp.h>
-
 #include <algorithm>
 #include <array>
 #include <cstdio>
 #include <regex>
+
+#include <openssl/evp.h>
 
 #include "devsts/xml_security.h"
 

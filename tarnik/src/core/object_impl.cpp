@@ -1,7 +1,8 @@
-#include <tarnik/core/object_impl.h>
+#include <typeinfo>
 
 #include <boost/core/demangle.hpp>
-#include <typeinfo>
+
+#include <tarnik/core/object_impl.h>
 
 namespace Tarnik {
 

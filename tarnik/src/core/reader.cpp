@@ -1,10 +1,9 @@
-#include <tarnik/core/reader.h>
-
 #include <algorithm>
 #include <cstring>
 #include <utility>
 
 #include <tarnik/core/object_impl.h>
+#include <tarnik/core/reader.h>
 
 #include "support/cleanse.h"
 

@@ -1,8 +1,9 @@
-#include <tarnik/core/throwable.h>
-
-#include <boost/core/demangle.hpp>
 #include <typeinfo>
 #include <utility>
+
+#include <boost/core/demangle.hpp>
+
+#include <tarnik/core/throwable.h>
 
 namespace Tarnik {
 

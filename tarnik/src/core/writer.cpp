@@ -1,6 +1,5 @@
-#include <tarnik/core/writer.h>
-
 #include <tarnik/core/object_impl.h>
+#include <tarnik/core/writer.h>
 
 #include "support/sensitive_text.h"
 

@@ -1,12 +1,13 @@
-#include <tarnik/crypto/certificate.h>
-
-#include <openssl/pem.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/crypto/crypto_exception.h>
 #include <chrono>
 #include <climits>
 #include <ctime>
 #include <utility>
+
+#include <openssl/pem.h>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/crypto_exception.h>
 
 #include "crypto/certificate_cache.h"
 #include "crypto/load_file.h"

@@ -1,13 +1,14 @@
 #ifndef TARNIK_CRYPTO_CERTIFICATE_CACHE_H
 #define TARNIK_CRYPTO_CERTIFICATE_CACHE_H
 
-#include <tarnik/core/ref.h>
-#include <tarnik/crypto/certificate.h>
 #include <cstddef>
 #include <list>
 #include <mutex>
 #include <string_view>
 #include <unordered_map>
+
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
 
 namespace Tarnik::Crypto {
 

@@ -1,6 +1,6 @@
-#include <tarnik/crypto/crypto_exception.h>
-
 #include <utility>
+
+#include <tarnik/crypto/crypto_exception.h>
 
 namespace Tarnik::Crypto {
 

@@ -1,7 +1,8 @@
 #include "crypto/hash.h"
 
-#include <tarnik/crypto/crypto_exception.h>
 #include <string>
+
+#include <tarnik/crypto/crypto_exception.h>
 
 #include "support/openssl_error.h"
 

@@ -1,11 +1,12 @@
 #include "crypto/key_context_pool.h"
 
+#include <string>
+#include <utility>
+
 #include <openssl/provider.h>
 #include <openssl/rsa.h>
 
 #include <tarnik/crypto/crypto_exception.h>
-#include <string>
-#include <utility>
 
 #include "support/openssl_error.h"
 

@@ -1,9 +1,10 @@
 #include "crypto/passphrase.h"
 
-#include <tarnik/crypto/crypto_exception.h>
-#include <tarnik/text/string_util.h>
 #include <algorithm>
 #include <cstddef>
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/text/string_util.h>
 
 namespace Tarnik::Crypto {
 namespace {

@@ -1,9 +1,10 @@
 #ifndef TARNIK_CRYPTO_PASSPHRASE_H
 #define TARNIK_CRYPTO_PASSPHRASE_H
 
-#include <tarnik/crypto/private_key.h>
 #include <exception>
 #include <string>
+
+#include <tarnik/crypto/private_key.h>
 
 namespace Tarnik::Crypto {
 

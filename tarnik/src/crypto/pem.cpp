@@ -1,12 +1,13 @@
 #include "crypto/pem.h"
 
+#include <climits>
+#include <utility>
+
 #include <openssl/crypto.h>
 #include <openssl/err.h>
 #include <openssl/pem.h>
 
 #include <tarnik/crypto/crypto_exception.h>
-#include <climits>
-#include <utility>
 
 namespace Tarnik::Crypto {
 namespace {

@@ -1,7 +1,7 @@
+#include <climits>
+
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/crypto/private_key.h>
-
-#include <climits>
 
 #include "crypto/load_file.h"
 #include "crypto/passphrase.h"

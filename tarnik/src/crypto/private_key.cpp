@@ -1,10 +1,10 @@
-#include <tarnik/crypto/private_key.h>
+#include <optional>
+#include <utility>
 
 #include <openssl/pem.h>
 
 #include <tarnik/crypto/crypto_exception.h>
-#include <optional>
-#include <utility>
+#include <tarnik/crypto/private_key.h>
 
 #include "crypto/load_file.h"
 #include "crypto/passphrase.h"

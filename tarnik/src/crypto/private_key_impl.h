@@ -1,10 +1,11 @@
 #ifndef TARNIK_CRYPTO_PRIVATE_KEY_IMPL_H
 #define TARNIK_CRYPTO_PRIVATE_KEY_IMPL_H
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/crypto/private_key.h>
 #include <string>
 #include <vector>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/crypto/private_key.h>
 
 #include "crypto/key_context_pool.h"
 #include "crypto/public_key_impl.h"

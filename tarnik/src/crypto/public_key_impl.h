@@ -1,9 +1,10 @@
 #ifndef TARNIK_CRYPTO_PUBLIC_KEY_IMPL_H
 #define TARNIK_CRYPTO_PUBLIC_KEY_IMPL_H
 
+#include <cstddef>
+
 #include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/public_key.h>
-#include <cstddef>
 
 #include "crypto/hash.h"
 #include "crypto/key_context_pool.h"

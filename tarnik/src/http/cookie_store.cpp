@@ -1,5 +1,3 @@
-#include <tarnik/http/cookie_store.h>
-
 #include <algorithm>
 #include <mutex>
 #include <optional>
@@ -7,6 +5,7 @@
 #include <vector>
 
 #include <tarnik/core/object_impl.h>
+#include <tarnik/http/cookie_store.h>
 #include <tarnik/text/string_util.h>
 
 #include "http/set_cookie.h"

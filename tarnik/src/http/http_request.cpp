@@ -1,11 +1,10 @@
-#include "http/http_request_impl.h"
-
 #include <algorithm>
 #include <array>
 
 #include <tarnik/core/exception.h>
 
 #include "http/field_syntax.h"
+#include "http/http_request_impl.h"
 #include "support/ascii.h"
 
 namespace Tarnik::Http {

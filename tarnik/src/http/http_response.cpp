@@ -1,5 +1,4 @@
 #include "http/http_response_impl.h"
-
 #include "support/ascii.h"
 
 namespace Tarnik::Http {

@@ -1,9 +1,8 @@
-#include <tarnik/http/http_url.h>
-
 #include <algorithm>
 #include <utility>
 
 #include <tarnik/core/exception.h>
+#include <tarnik/http/http_url.h>
 
 #include "support/ascii.h"
 #include "system/host_name.h"

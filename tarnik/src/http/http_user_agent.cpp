@@ -1,5 +1,3 @@
-#include <tarnik/http/http_user_agent.h>
-
 #include <memory>
 #include <string>
 #include <string_view>
@@ -7,6 +5,7 @@
 
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/http/http_user_agent.h>
 
 #include "http/exchange.h"
 #include "http/http_request_impl.h"

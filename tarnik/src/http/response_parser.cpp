@@ -1,9 +1,9 @@
 #include "http/response_parser.h"
 
-#include <boost/beast/http/basic_parser.hpp>
-
 #include <algorithm>
 #include <utility>
+
+#include <boost/beast/http/basic_parser.hpp>
 
 #include <tarnik/http/http_exception.h>
 #include <tarnik/http/http_user_agent.h>

@@ -1,8 +1,3 @@
-#include <tarnik/service/log.h>
-
-#include <spdlog/logger.h>
-#include <spdlog/sinks/stdout_sinks.h>
-
 #include <algorithm>
 #include <atomic>
 #include <map>
@@ -11,7 +6,11 @@
 #include <shared_mutex>
 #include <utility>
 
+#include <spdlog/logger.h>
+#include <spdlog/sinks/stdout_sinks.h>
+
 #include <tarnik/core/exception.h>
+#include <tarnik/service/log.h>
 
 #include "support/ascii.h"
 

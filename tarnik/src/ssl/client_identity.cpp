@@ -1,10 +1,10 @@
 #include "ssl/client_identity.h"
 
+#include <string>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/ssl/ssl_exception.h>
-
-#include <string>
 
 #include "crypto/private_key_impl.h"
 #include "ssl/decode_certificate.h"

@@ -1,9 +1,10 @@
 #include "ssl/peer_check.h"
 
-#include <arpa/inet.h>
-#include <tarnik/ssl/ssl_exception.h>
-
 #include <algorithm>
+
+#include <arpa/inet.h>
+
+#include <tarnik/ssl/ssl_exception.h>
 
 #include "system/host_name.h"
 

@@ -1,9 +1,10 @@
 #ifndef TARNIK_SSL_PEER_CHECK_H
 #define TARNIK_SSL_PEER_CHECK_H
 
-#include <tarnik/crypto/certificate.h>
 #include <string>
 #include <vector>
+
+#include <tarnik/crypto/certificate.h>
 
 #include "support/openssl.h"
 

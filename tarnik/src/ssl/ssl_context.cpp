@@ -1,8 +1,8 @@
+#include <algorithm>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/ssl/ssl_context.h>
 #include <tarnik/ssl/ssl_exception.h>
-
-#include <algorithm>
 
 #include "ssl/client_identity.h"
 #include "ssl/ssl_context_impl.h"

@@ -1,10 +1,10 @@
 #ifndef TARNIK_SSL_SSL_CONTEXT_IMPL_H
 #define TARNIK_SSL_SSL_CONTEXT_IMPL_H
 
+#include <string>
+
 #include <tarnik/core/object_impl.h>
 #include <tarnik/ssl/ssl_context.h>
-
-#include <string>
 
 #include "ssl/peer_check.h"
 #include "ssl/session_cache.h"

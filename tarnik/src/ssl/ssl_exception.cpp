@@ -1,6 +1,6 @@
-#include <tarnik/ssl/ssl_exception.h>
-
 #include <utility>
+
+#include <tarnik/ssl/ssl_exception.h>
 
 namespace Tarnik::Ssl {
 

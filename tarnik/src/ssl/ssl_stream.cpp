@@ -1,15 +1,15 @@
 #include "ssl/ssl_stream.h"
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/ssl/ssl_exception.h>
-#include <tarnik/system/thread_pool.h>
-
 #include <array>
 #include <memory>
 #include <mutex>
 #include <optional>
 #include <utility>
 #include <vector>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/ssl/ssl_exception.h>
+#include <tarnik/system/thread_pool.h>
 
 #include "core/copy_exception.h"
 #include "ssl/tls_engine.h"

@@ -1,9 +1,9 @@
 #ifndef TARNIK_SSL_SSL_STREAM_H
 #define TARNIK_SSL_SSL_STREAM_H
 
-#include <tarnik/ssl/ssl_context.h>
-
 #include <string>
+
+#include <tarnik/ssl/ssl_context.h>
 
 #include "ssl/ssl_context_impl.h"
 

@@ -1,11 +1,12 @@
 #include "ssl/tls_engine.h"
 
-#include <openssl/err.h>
-#include <tarnik/text/string_util.h>
-
 #include <algorithm>
 #include <climits>
 #include <utility>
+
+#include <openssl/err.h>
+
+#include <tarnik/text/string_util.h>
 
 #include "support/openssl_error.h"
 

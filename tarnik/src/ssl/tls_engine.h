@@ -1,11 +1,12 @@
 #ifndef TARNIK_SSL_TLS_ENGINE_H
 #define TARNIK_SSL_TLS_ENGINE_H
 
-#include <tarnik/ssl/ssl_exception.h>
 #include <cstddef>
 #include <optional>
 #include <string>
 #include <vector>
+
+#include <tarnik/ssl/ssl_exception.h>
 
 #include "ssl/peer_check.h"
 #include "ssl/ssl_context_impl.h"

@@ -1,13 +1,14 @@
 #include "ssl/trust_store.h"
 
-#include <sys/stat.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/ssl/ssl_exception.h>
-#include <unistd.h>
-
 #include <cerrno>
 #include <string>
 #include <system_error>
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/ssl/ssl_exception.h>
 
 #include "ssl/decode_certificate.h"
 #include "support/openssl_error.h"

@@ -1,6 +1,8 @@
 #ifndef TARNIK_SUPPORT_OPENSSL_H
 #define TARNIK_SUPPORT_OPENSSL_H
 
+#include <memory>
+
 #include <openssl/bio.h>
 #include <openssl/bn.h>
 #include <openssl/ecdsa.h>
@@ -10,8 +12,6 @@
 #include <openssl/store.h>
 #include <openssl/x509.h>
 #include <openssl/x509v3.h>
-
-#include <memory>
 
 namespace Tarnik::OpenSsl {
 

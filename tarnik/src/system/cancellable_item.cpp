@@ -1,7 +1,8 @@
+#include <utility>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/system/cancellable_item.h>
-#include <utility>
 
 namespace Tarnik::System {
 namespace {

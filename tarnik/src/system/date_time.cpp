@@ -1,10 +1,10 @@
-#include <tarnik/system/date_time.h>
-
 #include <algorithm>
 #include <chrono>
 #include <cstdio>
 #include <ctime>
 #include <limits>
+
+#include <tarnik/system/date_time.h>
 
 namespace Tarnik::System {
 namespace {

@@ -1,13 +1,15 @@
 #include "system/file.h"
 
-#include <openssl/crypto.h>
-#include <tarnik/core/exception.h>
 #include <array>
 #include <cerrno>
 #include <cstddef>
 #include <cstdio>
 #include <memory>
 #include <system_error>
+
+#include <openssl/crypto.h>
+
+#include <tarnik/core/exception.h>
 
 namespace Tarnik::System {
 namespace {

@@ -1,11 +1,11 @@
 #include "system/host_lookup.h"
 
-#include <netdb.h>
-
 #include <cerrno>
 #include <cstring>
 #include <memory>
 #include <system_error>
+
+#include <netdb.h>
 
 #include "system/host_name.h"
 

@@ -1,10 +1,10 @@
 #ifndef TARNIK_SYSTEM_HOST_LOOKUP_H
 #define TARNIK_SYSTEM_HOST_LOOKUP_H
 
-#include <sys/socket.h>
-
 #include <string>
 #include <vector>
+
+#include <sys/socket.h>
 
 namespace Tarnik::System {
 

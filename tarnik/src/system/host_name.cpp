@@ -1,9 +1,10 @@
 #include "system/host_name.h"
 
-#include <arpa/inet.h>
-#include <tarnik/core/exception.h>
-
 #include <algorithm>
+
+#include <arpa/inet.h>
+
+#include <tarnik/core/exception.h>
 
 #include "support/ascii.h"
 

@@ -1,11 +1,11 @@
 #include "system/pool_thread.h"
 
+#include <thread>
+#include <utility>
+
 #include <pthread.h>
 #include <signal.h>
 #include <unistd.h>
-
-#include <thread>
-#include <utility>
 
 namespace Tarnik::System {
 namespace {

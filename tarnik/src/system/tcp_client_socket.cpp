@@ -1,12 +1,13 @@
-#include <tarnik/core/object_impl.h>
-#include <tarnik/system/tcp_client_socket.h>
-
-#include <boost/asio/buffer.hpp>
-#include <boost/asio/ip/tcp.hpp>
 #include <cstring>
 #include <mutex>
 #include <utility>
 #include <vector>
+
+#include <boost/asio/buffer.hpp>
+#include <boost/asio/ip/tcp.hpp>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/system/tcp_client_socket.h>
 
 #include "system/host_lookup.h"
 #include "system/host_name.h"

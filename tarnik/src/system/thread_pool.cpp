@@ -1,13 +1,14 @@
-#include <tarnik/core/exception.h>
-#include <tarnik/system/thread_pool.h>
-
 #include <algorithm>
-#include <boost/asio/io_context.hpp>
-#include <boost/asio/post.hpp>
-#include <boost/asio/steady_timer.hpp>
 #include <cstdlib>
 #include <new>
 #include <utility>
+
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/post.hpp>
+#include <boost/asio/steady_timer.hpp>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/system/thread_pool.h>
 
 #include "support/openssl_init.h"
 #include "system/pool_thread.h"

@@ -1,13 +1,14 @@
 #ifndef TARNIK_SYSTEM_THREAD_POOL_IMPL_H
 #define TARNIK_SYSTEM_THREAD_POOL_IMPL_H
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/system/thread_pool.h>
 #include <chrono>
 #include <condition_variable>
 #include <cstddef>
 #include <memory>
 #include <mutex>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/system/thread_pool.h>
 
 #include "system/worker_set.h"
 

@@ -1,13 +1,12 @@
-#include <tarnik/text/base64.h>
-
-#include <openssl/evp.h>
-
 #include <algorithm>
 #include <cstring>
 #include <limits>
 #include <string>
 
+#include <openssl/evp.h>
+
 #include <tarnik/core/exception.h>
+#include <tarnik/text/base64.h>
 
 namespace Tarnik {
 namespace {

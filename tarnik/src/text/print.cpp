@@ -1,8 +1,8 @@
-#include <tarnik/text/print.h>
-
 #include <algorithm>
 #include <cstdint>
 #include <cstdio>
+
+#include <tarnik/text/print.h>
 
 #include "support/ascii.h"
 

@@ -1,15 +1,14 @@
-#include <tarnik/text/string_util.h>
-
-#include <openssl/evp.h>
-#include <boost/uuid/random_generator.hpp>
-#include <boost/uuid/uuid_io.hpp>
-
 #include <algorithm>
 #include <array>
 #include <cstddef>
 
+#include <boost/uuid/random_generator.hpp>
+#include <boost/uuid/uuid_io.hpp>
+#include <openssl/evp.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/text/base64.h>
+#include <tarnik/text/string_util.h>
 
 #include "support/ascii.h"
 #include "support/cleanse.h"

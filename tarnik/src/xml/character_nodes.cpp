@@ -1,6 +1,5 @@
-#include <tarnik/xml/character_nodes.h>
-
 #include <tarnik/core/exception.h>
+#include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/element_node.h>
 
 #include "support/quote.h"

@@ -1,11 +1,10 @@
-#include <tarnik/xml/element_node.h>
-
 #include <algorithm>
 #include <limits>
 #include <memory>
 #include <string>
 
 #include <tarnik/core/exception.h>
+#include <tarnik/xml/element_node.h>
 
 #include "support/quote.h"
 #include "xml/equal_prefixes.h"

@@ -1,9 +1,9 @@
 #ifndef TARNIK_XML_EXPAT_MEMORY_H
 #define TARNIK_XML_EXPAT_MEMORY_H
 
-#include <expat.h>
-
 #include <cstddef>
+
+#include <expat.h>
 
 namespace Tarnik::Xml {
 

@@ -1,7 +1,6 @@
-#include <tarnik/xml/node.h>
-
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/element_node.h>
+#include <tarnik/xml/node.h>
 
 #include "support/quote.h"
 #include "xml/tree.h"

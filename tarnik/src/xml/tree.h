@@ -2,9 +2,10 @@
 #define TARNIK_XML_TREE_H
 
 #include <atomic>
-#include <boost/smart_ptr/intrusive_ptr.hpp>
 #include <cstddef>
 #include <string_view>
+
+#include <boost/smart_ptr/intrusive_ptr.hpp>
 
 #include "xml/interned_name.h"
 

@@ -1,8 +1,3 @@
-#include <tarnik/xml/xml_parser.h>
-
-#include <expat.h>
-#include <sys/random.h>
-
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
@@ -16,10 +11,14 @@
 #include <utility>
 #include <vector>
 
+#include <expat.h>
+#include <sys/random.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/text/string_util.h>
 #include <tarnik/xml/xml_parse_exception.h>
+#include <tarnik/xml/xml_parser.h>
 
 #include "xml/expat_memory.h"
 

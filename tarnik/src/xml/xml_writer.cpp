@@ -1,8 +1,7 @@
-#include <tarnik/xml/xml_writer.h>
-
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/element_node.h>
+#include <tarnik/xml/xml_writer.h>
 
 #include "xml/output_buffer.h"
 #include "xml/tree_builder.h"

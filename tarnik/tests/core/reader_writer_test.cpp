@@ -1,8 +1,9 @@
+#include <string>
+
 #include <gtest/gtest.h>
+
 #include <tarnik/core/reader.h>
 #include <tarnik/core/writer.h>
-
-#include <string>
 
 namespace Tarnik::Testing {
 namespace {

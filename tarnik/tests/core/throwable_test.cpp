@@ -1,13 +1,13 @@
-#include <tarnik/core/throwable.h>
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-
 #include <cstring>
 #include <memory>
 #include <string>
 #include <typeinfo>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/throwable.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,14 +1,14 @@
-#include <tarnik/core/weak_linkable_impl.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/core/checked_cast.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-
 #include <atomic>
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/weak_linkable_impl.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,9 +1,9 @@
 #include "crypto/certificate_cache.h"
 
-#include <gtest/gtest.h>
-
 #include <string>
 #include <string_view>
+
+#include <gtest/gtest.h>
 
 #include "support/test_certificates.h"
 

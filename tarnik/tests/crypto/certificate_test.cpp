@@ -1,17 +1,17 @@
-#include <tarnik/crypto/certificate.h>
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <openssl/err.h>
-#include <openssl/pem.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/crypto/crypto_exception.h>
-
 #include <atomic>
 #include <cstddef>
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <openssl/err.h>
+#include <openssl/pem.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/crypto_exception.h>
 
 #include "support/openssl.h"
 #include "support/test_certificates.h"

@@ -2,6 +2,7 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+
 #include <tarnik/crypto/crypto_exception.h>
 
 namespace Tarnik::Testing {

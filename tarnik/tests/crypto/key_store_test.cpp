@@ -1,10 +1,11 @@
-#include <gtest/gtest.h>
-#include <openssl/err.h>
-#include <tarnik/crypto/crypto_exception.h>
-#include <tarnik/crypto/private_key.h>
-
 #include <stdexcept>
 #include <string>
+
+#include <gtest/gtest.h>
+#include <openssl/err.h>
+
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/crypto/private_key.h>
 
 #include "support/key_texts.h"
 #include "support/openssl.h"

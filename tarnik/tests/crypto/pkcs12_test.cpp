@@ -1,13 +1,13 @@
-#include <tarnik/crypto/private_key.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/crypto/crypto_exception.h>
-
 #include <cstddef>
 #include <stdexcept>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/crypto/private_key.h>
 
 #include "support/openssl.h"
 #include "support/test_pki.h"

@@ -1,16 +1,16 @@
-#include <tarnik/crypto/private_key.h>
-
-#include <gtest/gtest.h>
-#include <openssl/err.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/crypto/certificate.h>
-#include <tarnik/crypto/crypto_exception.h>
-
 #include <cstddef>
 #include <stdexcept>
 #include <string>
 #include <string_view>
 #include <tuple>
+
+#include <gtest/gtest.h>
+#include <openssl/err.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/crypto/private_key.h>
 
 #include "support/key_texts.h"
 #include "support/openssl.h"

@@ -1,11 +1,3 @@
-#include "http/idle_connections.h"
-
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/http/http_response.h>
-#include <tarnik/http/http_user_agent.h>
-
 #include <algorithm>
 #include <atomic>
 #include <chrono>
@@ -15,7 +7,15 @@
 #include <thread>
 #include <vector>
 
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/http_response.h>
+#include <tarnik/http/http_user_agent.h>
+
 #include "http/exchange_fixture.h"
+#include "http/idle_connections.h"
 #include "support/scripted_spec.h"
 #include "support/scripted_stream.h"
 

@@ -1,14 +1,15 @@
 #include "http/connection.h"
 
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/system/stream.h>
-
 #include <atomic>
 #include <memory>
 #include <string>
 #include <string_view>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/system/stream.h>
 
 #include "http/exchange_fixture.h"
 #include "support/scripted_stream.h"

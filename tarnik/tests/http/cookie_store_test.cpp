@@ -1,12 +1,12 @@
-#include <tarnik/http/cookie_store.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/system/date_time.h>
-
 #include <string>
 #include <string_view>
 #include <thread>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/http/cookie_store.h>
+#include <tarnik/system/date_time.h>
 
 namespace Tarnik::Testing {
 namespace {

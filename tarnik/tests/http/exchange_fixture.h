@@ -1,20 +1,21 @@
 #ifndef TARNIK_TESTS_HTTP_EXCHANGE_FIXTURE_H
 #define TARNIK_TESTS_HTTP_EXCHANGE_FIXTURE_H
 
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/http/cookie_store.h>
-#include <tarnik/http/http_request.h>
-#include <tarnik/http/http_response.h>
-#include <tarnik/http/http_user_agent.h>
-
 #include <atomic>
 #include <chrono>
 #include <memory>
 #include <string>
 #include <thread>
 #include <utility>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/cookie_store.h>
+#include <tarnik/http/http_request.h>
+#include <tarnik/http/http_response.h>
+#include <tarnik/http/http_user_agent.h>
 
 #include "http/response_body.h"
 #include "support/outcome.h"

@@ -1,12 +1,5 @@
 #include "http/exchange.h"
 
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/http/http_exception.h>
-#include <tarnik/http/http_response.h>
-#include <tarnik/http/http_user_agent.h>
-
 #include <atomic>
 #include <chrono>
 #include <cstddef>
@@ -14,6 +7,14 @@
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/http_exception.h>
+#include <tarnik/http/http_response.h>
+#include <tarnik/http/http_user_agent.h>
 
 #include "http/exchange_fixture.h"
 #include "http/response_body.h"

@@ -1,10 +1,10 @@
-#include <tarnik/http/http_request.h>
+#include <string>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/exception.h>
-
-#include <string>
+#include <tarnik/http/http_request.h>
 
 #include "http/http_request_impl.h"
 #include "support/sensitive_text.h"

@@ -1,9 +1,9 @@
-#include <tarnik/http/http_url.h>
+#include <string>
 
 #include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
 
-#include <string>
+#include <tarnik/core/exception.h>
+#include <tarnik/http/http_url.h>
 
 #include "support/thrown_message.h"
 

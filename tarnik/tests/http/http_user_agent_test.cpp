@@ -1,13 +1,13 @@
-#include <tarnik/http/http_user_agent.h>
+#include <memory>
+#include <string>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/http/cookie_store.h>
 #include <tarnik/http/http_response.h>
+#include <tarnik/http/http_user_agent.h>
 #include <tarnik/system/date_time.h>
-
-#include <memory>
-#include <string>
 
 #include "http/exchange_fixture.h"
 #include "support/scripted_spec.h"

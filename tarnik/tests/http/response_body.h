@@ -1,10 +1,10 @@
 #ifndef TARNIK_TESTS_HTTP_RESPONSE_BODY_H
 #define TARNIK_TESTS_HTTP_RESPONSE_BODY_H
 
-#include <tarnik/http/http_response.h>
-
 #include <cstddef>
 #include <string>
+
+#include <tarnik/http/http_response.h>
 
 namespace Tarnik::Testing {
 

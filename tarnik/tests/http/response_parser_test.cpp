@@ -1,9 +1,5 @@
 #include "http/response_parser.h"
 
-#include <gtest/gtest.h>
-#include <tarnik/http/http_exception.h>
-#include <tarnik/http/http_user_agent.h>
-
 #include <algorithm>
 #include <cstddef>
 #include <optional>
@@ -11,6 +7,11 @@
 #include <string_view>
 #include <tuple>
 #include <utility>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/http/http_exception.h>
+#include <tarnik/http/http_user_agent.h>
 
 #include "http/response_body.h"
 #include "support/thrown_message.h"

@@ -1,13 +1,13 @@
-#include <tarnik/service/log.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-
 #include <mutex>
 #include <stdexcept>
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/service/log.h>
 
 namespace Tarnik::Testing {
 namespace {

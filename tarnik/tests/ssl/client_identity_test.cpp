@@ -1,14 +1,15 @@
 #include "ssl/client_identity.h"
 
+#include <string>
+
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/crypto/public_key.h>
 #include <tarnik/ssl/ssl_context.h>
 #include <tarnik/ssl/ssl_exception.h>
-
-#include <string>
 
 #include "ssl/tls_fixture.h"
 #include "support/key_texts.h"

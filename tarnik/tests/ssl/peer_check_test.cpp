@@ -1,13 +1,14 @@
 #include "ssl/peer_check.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <tarnik/ssl/ssl_context.h>
-#include <tarnik/ssl/ssl_exception.h>
-
 #include <ostream>
 #include <string>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/ssl/ssl_exception.h>
 
 #include "ssl/tls_fixture.h"
 #include "support/test_pki.h"

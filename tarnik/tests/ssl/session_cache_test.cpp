@@ -1,10 +1,10 @@
 #include "ssl/session_cache.h"
 
-#include <gtest/gtest.h>
-
 #include <chrono>
 #include <cstddef>
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "ssl/tls_fixture.h"
 #include "support/openssl.h"

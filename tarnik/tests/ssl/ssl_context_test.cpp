@@ -1,10 +1,10 @@
-#include <tarnik/ssl/ssl_context.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-
 #include <string>
 #include <utility>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/ssl/ssl_context.h>
 
 #include "ssl/tls_fixture.h"
 #include "support/outcome.h"

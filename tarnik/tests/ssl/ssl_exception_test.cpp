@@ -1,7 +1,7 @@
-#include <tarnik/ssl/ssl_exception.h>
-
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
+#include <tarnik/ssl/ssl_exception.h>
 
 namespace Tarnik::Testing {
 namespace {

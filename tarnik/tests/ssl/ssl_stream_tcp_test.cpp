@@ -1,13 +1,14 @@
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/ssl/ssl_context.h>
-#include <tarnik/ssl/ssl_exception.h>
-
 #include <atomic>
 #include <cstddef>
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/ssl/ssl_exception.h>
 
 #include "ssl/tls_fixture.h"
 #include "support/loopback.h"

@@ -1,13 +1,5 @@
 #include "ssl/ssl_stream.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/ssl/ssl_context.h>
-#include <tarnik/ssl/ssl_exception.h>
-#include <tarnik/system/stream.h>
-
 #include <atomic>
 #include <chrono>
 #include <cstddef>
@@ -16,6 +8,15 @@
 #include <thread>
 #include <utility>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/ssl/ssl_exception.h>
+#include <tarnik/system/stream.h>
 
 #include "ssl/tls_fixture.h"
 #include "support/memory_tls_peer.h"

@@ -1,13 +1,14 @@
 #ifndef TARNIK_TESTS_SSL_TLS_FIXTURE_H
 #define TARNIK_TESTS_SSL_TLS_FIXTURE_H
 
+#include <string>
+
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/ssl/ssl_context.h>
 #include <tarnik/system/tcp_client_socket.h>
 #include <tarnik/system/thread_pool.h>
-
-#include <string>
 
 #include "support/openssl.h"
 #include "support/outcome.h"

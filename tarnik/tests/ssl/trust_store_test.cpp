@@ -1,18 +1,19 @@
 #include "ssl/trust_store.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/ssl/ssl_context.h>
-#include <tarnik/ssl/ssl_exception.h>
-#include <unistd.h>
-
 #include <cstdio>
 #include <cstdlib>
 #include <memory>
 #include <string>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/ssl/ssl_context.h>
+#include <tarnik/ssl/ssl_exception.h>
 
 #include "ssl/tls_fixture.h"
 #include "support/test_pki.h"

@@ -1,10 +1,11 @@
 #include "system/file.h"
 
+#include <string>
+
 #include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
 #include <unistd.h>
 
-#include <string>
+#include <tarnik/core/exception.h>
 
 #include "support/sensitive_text.h"
 #include "support/test_pki.h"

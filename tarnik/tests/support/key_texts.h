@@ -1,10 +1,10 @@
 #ifndef TARNIK_TESTS_SUPPORT_KEY_TEXTS_H
 #define TARNIK_TESTS_SUPPORT_KEY_TEXTS_H
 
-#include <openssl/pem.h>
-
 #include <cstddef>
 #include <string>
+
+#include <openssl/pem.h>
 
 #include "support/openssl.h"
 #include "support/test_certificates.h"

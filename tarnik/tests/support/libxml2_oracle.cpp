@@ -1,13 +1,13 @@
 #include "support/libxml2_oracle.h"
 
-#include <libxml/c14n.h>
-#include <libxml/parser.h>
-#include <libxml/xmlerror.h>
-
 #include <memory>
 #include <optional>
 #include <string>
 #include <vector>
+
+#include <libxml/c14n.h>
+#include <libxml/parser.h>
+#include <libxml/xmlerror.h>
 
 namespace Tarnik::Testing {
 

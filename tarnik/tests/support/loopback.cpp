@@ -1,16 +1,16 @@
 #include "support/loopback.h"
 
-#include <netinet/in.h>
-#include <poll.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
 #include <cerrno>
 #include <cstddef>
 #include <cstring>
 #include <stdexcept>
 #include <string>
 #include <utility>
+
+#include <netinet/in.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <unistd.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,15 +1,16 @@
 #include "support/memory_tls_peer.h"
 
-#include <openssl/err.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/system/thread_pool.h>
-
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
 #include <functional>
 #include <mutex>
 #include <utility>
+
+#include <openssl/err.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/system/thread_pool.h>
 
 namespace Tarnik::Testing {
 

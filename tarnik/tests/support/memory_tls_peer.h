@@ -1,14 +1,14 @@
 #ifndef TARNIK_TESTS_SUPPORT_MEMORY_TLS_PEER_H
 #define TARNIK_TESTS_SUPPORT_MEMORY_TLS_PEER_H
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/system/stream.h>
-
 #include <cstddef>
 #include <functional>
 #include <limits>
 #include <mutex>
 #include <string>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/system/stream.h>
 
 #include "support/openssl.h"
 

@@ -1,14 +1,14 @@
 #ifndef TARNIK_TESTS_SUPPORT_NEW_SIGNATURES_H
 #define TARNIK_TESTS_SUPPORT_NEW_SIGNATURES_H
 
+#include <string>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/element_node.h>
 #include <tarnik/xml/security/signature.h>
 #include <tarnik/xml/security/xml_security_exception.h>
-
-#include <string>
 
 #include "support/algorithm_uris.h"
 #include "support/signed_documents.h"

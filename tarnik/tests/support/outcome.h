@@ -1,10 +1,6 @@
 #ifndef TARNIK_TESTS_SUPPORT_OUTCOME_H
 #define TARNIK_TESTS_SUPPORT_OUTCOME_H
 
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/system/stream.h>
-
 #include <chrono>
 #include <condition_variable>
 #include <cstddef>
@@ -12,6 +8,11 @@
 #include <mutex>
 #include <string>
 #include <thread>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/system/stream.h>
 
 namespace Tarnik::Testing {
 

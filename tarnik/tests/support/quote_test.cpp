@@ -1,9 +1,9 @@
 #include "support/quote.h"
 
-#include <gtest/gtest.h>
-
 #include <string>
 #include <string_view>
+
+#include <gtest/gtest.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,17 +1,17 @@
 #include "support/scripted_spec.h"
 
+#include <cstddef>
+#include <mutex>
+#include <string>
+#include <utility>
+#include <vector>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/ssl/ssl_context.h>
 #include <tarnik/system/cancellable_item.h>
 #include <tarnik/system/stream.h>
 #include <tarnik/system/thread_pool.h>
-
-#include <cstddef>
-#include <mutex>
-#include <string>
-#include <utility>
-#include <vector>
 
 #include "support/scripted_stream.h"
 

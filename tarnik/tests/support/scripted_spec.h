@@ -1,9 +1,6 @@
 #ifndef TARNIK_TESTS_SUPPORT_SCRIPTED_SPEC_H
 #define TARNIK_TESTS_SUPPORT_SCRIPTED_SPEC_H
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/http/connection_spec.h>
-
 #include <cstddef>
 #include <functional>
 #include <memory>
@@ -11,6 +8,9 @@
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/connection_spec.h>
 
 #include "support/scripted_stream.h"
 

@@ -1,8 +1,5 @@
 #include "support/scripted_stream.h"
 
-#include <tarnik/core/exception.h>
-#include <tarnik/system/thread_pool.h>
-
 #include <algorithm>
 #include <atomic>
 #include <cstddef>
@@ -10,6 +7,9 @@
 #include <mutex>
 #include <string>
 #include <utility>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/system/thread_pool.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,16 +1,16 @@
 #ifndef TARNIK_TESTS_SUPPORT_SCRIPTED_STREAM_H
 #define TARNIK_TESTS_SUPPORT_SCRIPTED_STREAM_H
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/core/ref.h>
-#include <tarnik/system/stream.h>
-
 #include <cstddef>
 #include <functional>
 #include <limits>
 #include <memory>
 #include <mutex>
 #include <string>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/system/stream.h>
 
 namespace Tarnik::Testing {
 

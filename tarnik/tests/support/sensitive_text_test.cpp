@@ -1,9 +1,9 @@
 #include "support/sensitive_text.h"
 
-#include <gtest/gtest.h>
-
 #include <cstddef>
 #include <string>
+
+#include <gtest/gtest.h>
 
 namespace Tarnik::Testing {
 namespace {

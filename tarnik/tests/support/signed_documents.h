@@ -1,9 +1,19 @@
 #ifndef TARNIK_TESTS_SUPPORT_SIGNED_DOCUMENTS_H
 #define TARNIK_TESTS_SUPPORT_SIGNED_DOCUMENTS_H
 
+#include <cstddef>
+#include <fstream>
+#include <initializer_list>
+#include <iterator>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include <openssl/pem.h>
+
 #include <devsts/certificates.h>
 #include <devsts/xml_security.h>
-#include <openssl/pem.h>
 #include <tarnik/core/writer.h>
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/text/string_util.h>
@@ -13,15 +23,6 @@
 #include <tarnik/xml/security/key_info_resolver.h>
 #include <tarnik/xml/security/signature.h>
 #include <tarnik/xml/security/xml_security_exception.h>
-
-#include <cstddef>
-#include <fstream>
-#include <initializer_list>
-#include <iterator>
-#include <stdexcept>
-#include <string>
-#include <string_view>
-#include <vector>
 
 #include "support/algorithm_uris.h"
 #include "support/openssl.h"

@@ -1,9 +1,9 @@
 #ifndef TARNIK_TESTS_SUPPORT_SOFTWARE_TPM_H
 #define TARNIK_TESTS_SUPPORT_SOFTWARE_TPM_H
 
-#include <sys/types.h>
-
 #include <string>
+
+#include <sys/types.h>
 
 namespace Tarnik::Testing {
 

@@ -1,12 +1,12 @@
 #ifndef TARNIK_TESTS_SUPPORT_TEST_CERTIFICATES_H
 #define TARNIK_TESTS_SUPPORT_TEST_CERTIFICATES_H
 
-#include <tarnik/crypto/certificate.h>
-
 #include <cstddef>
 #include <stdexcept>
 #include <string>
 #include <vector>
+
+#include <tarnik/crypto/certificate.h>
 
 #include "support/openssl.h"
 

@@ -1,15 +1,16 @@
 #include "support/test_pki.h"
 
-#include <gtest/gtest.h>
-#include <openssl/pem.h>
-#include <openssl/rand.h>
-#include <tarnik/crypto/certificate.h>
-#include <unistd.h>
-
 #include <cstddef>
 #include <cstdlib>
 #include <stdexcept>
 #include <string>
+
+#include <gtest/gtest.h>
+#include <openssl/pem.h>
+#include <openssl/rand.h>
+#include <unistd.h>
+
+#include <tarnik/crypto/certificate.h>
 
 #include "support/openssl.h"
 

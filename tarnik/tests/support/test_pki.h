@@ -1,10 +1,10 @@
 #ifndef TARNIK_TESTS_SUPPORT_TEST_PKI_H
 #define TARNIK_TESTS_SUPPORT_TEST_PKI_H
 
-#include <tarnik/crypto/certificate.h>
-
 #include <string>
 #include <vector>
+
+#include <tarnik/crypto/certificate.h>
 
 #include "support/openssl.h"
 

@@ -1,15 +1,15 @@
 #include "support/tls_peer.h"
 
-#include <openssl/err.h>
-#include <signal.h>
-#include <sys/socket.h>
-#include <sys/time.h>
-
 #include <cstddef>
 #include <stdexcept>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <openssl/err.h>
+#include <signal.h>
+#include <sys/socket.h>
+#include <sys/time.h>
 
 #include "support/openssl.h"
 #include "support/test_pki.h"

@@ -1,15 +1,15 @@
 #ifndef TARNIK_TESTS_SUPPORT_XML_TEXT_H
 #define TARNIK_TESTS_SUPPORT_XML_TEXT_H
 
+#include <string>
+#include <string_view>
+
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/reader.h>
 #include <tarnik/core/writer.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/xml_parser.h>
 #include <tarnik/xml/xml_writer.h>
-
-#include <string>
-#include <string_view>
 
 namespace Tarnik::Testing {
 

@@ -1,9 +1,9 @@
-#include <tarnik/system/cancellable_item.h>
+#include <memory>
 
 #include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
 
-#include <memory>
+#include <tarnik/core/exception.h>
+#include <tarnik/system/cancellable_item.h>
 
 namespace Tarnik::Testing {
 namespace {

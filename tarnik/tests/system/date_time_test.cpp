@@ -1,14 +1,14 @@
-#include <tarnik/system/date_time.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-
 #include <chrono>
 #include <cstddef>
 #include <cstdlib>
 #include <ctime>
 #include <limits>
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/system/date_time.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,9 +1,10 @@
 #include "system/host_name.h"
 
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
 
 #include "support/thrown_message.h"
 

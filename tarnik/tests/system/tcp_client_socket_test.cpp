@@ -1,15 +1,3 @@
-#include <tarnik/system/tcp_client_socket.h>
-
-#include <arpa/inet.h>
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <netinet/in.h>
-#include <netinet/tcp.h>
-#include <sys/socket.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/system/thread_pool.h>
-
 #include <atomic>
 #include <chrono>
 #include <cstddef>
@@ -17,6 +5,18 @@
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <arpa/inet.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <netinet/in.h>
+#include <netinet/tcp.h>
+#include <sys/socket.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/system/tcp_client_socket.h>
+#include <tarnik/system/thread_pool.h>
 
 #include "support/loopback.h"
 #include "support/outcome.h"

@@ -1,13 +1,13 @@
+#include <algorithm>
+#include <chrono>
+#include <string>
+#include <thread>
+
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include <algorithm>
-#include <chrono>
-#include <string>
-#include <thread>
 
 extern char** environ;
 

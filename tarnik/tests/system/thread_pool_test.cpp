@@ -1,9 +1,3 @@
-#include <tarnik/system/thread_pool.h>
-
-#include <gtest/gtest.h>
-#include <signal.h>
-#include <tarnik/core/exception.h>
-
 #include <atomic>
 #include <chrono>
 #include <future>
@@ -12,6 +6,12 @@
 #include <set>
 #include <thread>
 #include <vector>
+
+#include <gtest/gtest.h>
+#include <signal.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/system/thread_pool.h>
 
 #include "support/outcome.h"
 

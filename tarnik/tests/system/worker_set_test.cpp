@@ -1,7 +1,5 @@
 #include "system/worker_set.h"
 
-#include <gtest/gtest.h>
-
 #include <atomic>
 #include <chrono>
 #include <cstddef>
@@ -10,6 +8,8 @@
 #include <thread>
 #include <utility>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,14 +1,14 @@
-#include <tarnik/text/base64.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/text/string_util.h>
-
 #include <algorithm>
 #include <cstddef>
 #include <limits>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/text/base64.h>
+#include <tarnik/text/string_util.h>
 
 #include "support/thrown_message.h"
 

@@ -1,10 +1,10 @@
-#include <tarnik/text/print.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/system/date_time.h>
-
 #include <cstdint>
 #include <limits>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/system/date_time.h>
+#include <tarnik/text/print.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,14 +1,14 @@
-#include <tarnik/text/string_util.h>
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-
 #include <cstddef>
 #include <set>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/text/string_util.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,14 +1,15 @@
+#include <cstddef>
+#include <string>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/element_node.h>
 #include <tarnik/xml/xml_parser.h>
-
-#include <cstddef>
-#include <string>
-#include <vector>
 
 #include "support/libxml2_oracle.h"
 #include "support/xml_text.h"

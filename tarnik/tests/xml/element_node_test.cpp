@@ -1,13 +1,13 @@
-#include <tarnik/xml/element_node.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/xml/document.h>
-
 #include <optional>
 #include <ostream>
 #include <string>
 #include <string_view>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
 
 #include "support/thrown_message.h"
 #include "support/xml_text.h"

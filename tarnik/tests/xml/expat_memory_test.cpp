@@ -1,12 +1,12 @@
 #include "xml/expat_memory.h"
 
-#include <gtest/gtest.h>
-
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,19 +1,19 @@
-#include <tarnik/xml/node.h>
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <tarnik/core/checked_cast.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/xml/character_nodes.h>
-#include <tarnik/xml/document.h>
-#include <tarnik/xml/element_node.h>
-
 #include <cstddef>
 #include <functional>
 #include <string>
 #include <string_view>
 #include <thread>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/xml/character_nodes.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/node.h>
 
 #include "support/thrown_message.h"
 #include "support/xml_text.h"

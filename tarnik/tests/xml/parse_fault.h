@@ -1,10 +1,10 @@
 #ifndef TARNIK_TESTS_XML_PARSE_FAULT_H
 #define TARNIK_TESTS_XML_PARSE_FAULT_H
 
-#include <tarnik/xml/xml_parse_exception.h>
-
 #include <ostream>
 #include <string>
+
+#include <tarnik/xml/xml_parse_exception.h>
 
 #include "support/thrown_message.h"
 #include "support/xml_text.h"

@@ -1,13 +1,13 @@
 #ifndef TARNIK_TESTS_XML_PIECE_READER_H
 #define TARNIK_TESTS_XML_PIECE_READER_H
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/core/reader.h>
-
 #include <algorithm>
 #include <cstddef>
 #include <string>
 #include <utility>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/reader.h>
 
 namespace Tarnik::Testing {
 

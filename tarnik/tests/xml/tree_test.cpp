@@ -1,12 +1,12 @@
 #include "xml/tree.h"
 
-#include <gtest/gtest.h>
-
 #include <cstddef>
 #include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 namespace Tarnik::Testing {
 namespace {

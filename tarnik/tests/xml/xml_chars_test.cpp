@@ -1,11 +1,11 @@
 #include "xml/xml_chars.h"
 
-#include <gtest/gtest.h>
-#include <libxml/chvalid.h>
-
 #include <cstddef>
 #include <ios>
 #include <string>
+
+#include <gtest/gtest.h>
+#include <libxml/chvalid.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,8 +1,8 @@
-#include <tarnik/xml/xml_parse_exception.h>
+#include <memory>
 
 #include <gtest/gtest.h>
 
-#include <memory>
+#include <tarnik/xml/xml_parse_exception.h>
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,10 +1,11 @@
+#include <cstddef>
+#include <string>
+
 #include <gtest/gtest.h>
+
 #include <tarnik/core/object_impl.h>
 #include <tarnik/xml/xml_parse_exception.h>
 #include <tarnik/xml/xml_parser.h>
-
-#include <cstddef>
-#include <string>
 
 #include "support/thrown_message.h"
 #include "support/xml_text.h"

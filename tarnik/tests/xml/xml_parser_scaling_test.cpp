@@ -1,12 +1,13 @@
-#include <gtest/gtest.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/xml/xml_parse_exception.h>
-
 #include <algorithm>
 #include <cstddef>
 #include <ctime>
 #include <ostream>
 #include <string>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/xml/xml_parse_exception.h>
 
 #include "support/xml_text.h"
 #include "xml/piece_reader.h"

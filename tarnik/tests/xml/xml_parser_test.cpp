@@ -1,13 +1,3 @@
-#include <tarnik/xml/xml_parser.h>
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/core/reader.h>
-#include <tarnik/xml/document.h>
-#include <tarnik/xml/xml_parse_exception.h>
-
 #include <algorithm>
 #include <cstddef>
 #include <stdexcept>
@@ -15,6 +5,16 @@
 #include <string_view>
 #include <utility>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/reader.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/xml_parse_exception.h>
+#include <tarnik/xml/xml_parser.h>
 
 #include "support/xml_text.h"
 #include "xml/parse_fault.h"

@@ -1,16 +1,16 @@
-#include <tarnik/xml/xml_writer.h>
+#include <cstddef>
+#include <string>
+#include <string_view>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/writer.h>
 #include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/element_node.h>
-
-#include <cstddef>
-#include <string>
-#include <string_view>
+#include <tarnik/xml/xml_writer.h>
 
 #include "support/random_xml.h"
 #include "support/xml_text.h"

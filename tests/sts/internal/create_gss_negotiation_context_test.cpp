@@ -2,8 +2,9 @@
 #include <string>
 #include <vector>
 
-#include <devsts/xml_security.h>
 #include <gmock/gmock.h>
+
+#include <devsts/xml_security.h>
 #include <ssoclient/exceptions.h>
 #include <ssoclient/gss_negotiation_context.h>
 #include <ssoclient/holder_of_key_config.h>

@@ -5,14 +5,15 @@
 #include <utility>
 #include <vector>
 
+#include <boost/none.hpp>
 #include <gmock/gmock.h>
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/system/date_time.h>
 #include <tarnik/xml/security/key_info_resolver.h>
-#include <boost/none.hpp>
 
 #include "sts/answers.h"
 #include "sts/fakes.h"

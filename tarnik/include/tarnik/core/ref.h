@@ -1,8 +1,9 @@
 #ifndef TARNIK_CORE_REF_H
 #define TARNIK_CORE_REF_H
 
-#include <boost/smart_ptr/intrusive_ptr.hpp>
 #include <utility>
+
+#include <boost/smart_ptr/intrusive_ptr.hpp>
 
 #include <tarnik/core/object.h>
 

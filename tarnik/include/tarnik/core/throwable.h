@@ -1,10 +1,11 @@
 #ifndef TARNIK_CORE_THROWABLE_H
 #define TARNIK_CORE_THROWABLE_H
 
-#include <boost/assert/source_location.hpp>
 #include <exception>
 #include <memory>
 #include <string>
+
+#include <boost/assert/source_location.hpp>
 
 #include <tarnik/export.h>
 

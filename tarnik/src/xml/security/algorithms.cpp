@@ -1,7 +1,8 @@
 #include "xml/security/algorithms.h"
 
-#include <tarnik/xml/security/xml_security_exception.h>
 #include <algorithm>
+
+#include <tarnik/xml/security/xml_security_exception.h>
 
 #include "support/quote.h"
 #include "xml/security/content_reader.h"

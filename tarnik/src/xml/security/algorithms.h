@@ -1,10 +1,11 @@
 #ifndef TARNIK_XML_SECURITY_ALGORITHMS_H
 #define TARNIK_XML_SECURITY_ALGORITHMS_H
 
-#include <tarnik/xml/element_node.h>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include <tarnik/xml/element_node.h>
 
 #include "crypto/hash.h"
 #include "crypto/signature_scheme.h"

@@ -1,9 +1,8 @@
-#include <tarnik/xml/security/canonicalizer.h>
-
 #include <utility>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/xml/security/canonicalizer.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 
 #include "xml/security/c14n.h"

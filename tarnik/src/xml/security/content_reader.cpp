@@ -1,10 +1,11 @@
 #include "xml/security/content_reader.h"
 
+#include <algorithm>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/text/string_util.h>
 #include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/security/xml_security_exception.h>
-#include <algorithm>
 
 #include "support/quote.h"
 

@@ -1,11 +1,12 @@
 #ifndef TARNIK_XML_SECURITY_CONTENT_READER_H
 #define TARNIK_XML_SECURITY_CONTENT_READER_H
 
-#include <tarnik/xml/element_node.h>
 #include <initializer_list>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include <tarnik/xml/element_node.h>
 
 namespace Tarnik::Xml::Security {
 

@@ -1,11 +1,12 @@
 #ifndef TARNIK_XML_SECURITY_DIGEST_WRITER_H
 #define TARNIK_XML_SECURITY_DIGEST_WRITER_H
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/core/writer.h>
 #include <array>
 #include <cstddef>
 #include <string_view>
+
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/writer.h>
 
 #include "crypto/hash.h"
 #include "support/openssl.h"

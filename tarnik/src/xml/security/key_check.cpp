@@ -1,7 +1,8 @@
 #include "xml/security/key_check.h"
 
-#include <tarnik/xml/security/xml_security_exception.h>
 #include <string>
+
+#include <tarnik/xml/security/xml_security_exception.h>
 
 #include "support/quote.h"
 

@@ -1,9 +1,10 @@
 #include "xml/security/key_info_reader.h"
 
-#include <tarnik/xml/security/xml_security_exception.h>
 #include <algorithm>
 #include <array>
 #include <utility>
+
+#include <tarnik/xml/security/xml_security_exception.h>
 
 #include "support/quote.h"
 #include "xml/security/content_reader.h"

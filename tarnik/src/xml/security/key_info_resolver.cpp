@@ -1,12 +1,12 @@
-#include <tarnik/xml/security/key_info_resolver.h>
-
-#include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
-#include <tarnik/crypto/crypto_exception.h>
 #include <algorithm>
 #include <cstring>
 #include <string_view>
 #include <utility>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 
 namespace Tarnik::Xml::Security {
 namespace {

@@ -1,11 +1,12 @@
 #include "xml/security/new_signature.h"
 
+#include <string>
+#include <utility>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/text/string_util.h>
 #include <tarnik/xml/security/xml_security_exception.h>
-#include <string>
-#include <utility>
 
 #include "crypto/ecdsa_value.h"
 #include "xml/security/algorithms.h"

@@ -1,11 +1,12 @@
 #ifndef TARNIK_XML_SECURITY_NEW_SIGNATURE_H
 #define TARNIK_XML_SECURITY_NEW_SIGNATURE_H
 
+#include <cstddef>
+#include <vector>
+
 #include <tarnik/core/object_impl.h>
 #include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/security/signature.h>
-#include <cstddef>
-#include <vector>
 
 #include "crypto/private_key_impl.h"
 #include "xml/security/signature_impl.h"

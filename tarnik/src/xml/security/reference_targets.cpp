@@ -1,9 +1,10 @@
 #include "xml/security/reference_targets.h"
 
-#include <tarnik/xml/document.h>
-#include <tarnik/xml/security/xml_security_exception.h>
 #include <algorithm>
 #include <string_view>
+
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/security/xml_security_exception.h>
 
 #include "support/ascii.h"
 #include "support/quote.h"

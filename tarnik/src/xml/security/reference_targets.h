@@ -1,9 +1,10 @@
 #ifndef TARNIK_XML_SECURITY_REFERENCE_TARGETS_H
 #define TARNIK_XML_SECURITY_REFERENCE_TARGETS_H
 
+#include <vector>
+
 #include <tarnik/xml/element_node.h>
 #include <tarnik/xml/security/signature.h>
-#include <vector>
 
 namespace Tarnik::Xml::Security {
 

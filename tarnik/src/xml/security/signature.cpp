@@ -1,10 +1,10 @@
-#include <tarnik/xml/security/signature.h>
+#include <algorithm>
+#include <utility>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/xml/security/signature.h>
 #include <tarnik/xml/security/xml_security_exception.h>
-#include <algorithm>
-#include <utility>
 
 #include "crypto/ecdsa_value.h"
 #include "crypto/public_key_impl.h"

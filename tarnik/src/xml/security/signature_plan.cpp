@@ -1,7 +1,8 @@
 #include "xml/security/signature_plan.h"
 
-#include <tarnik/xml/security/xml_security_exception.h>
 #include <utility>
+
+#include <tarnik/xml/security/xml_security_exception.h>
 
 #include "support/quote.h"
 #include "xml/security/reference_targets.h"

@@ -1,8 +1,9 @@
 #ifndef TARNIK_XML_SECURITY_SIGNATURE_PLAN_H
 #define TARNIK_XML_SECURITY_SIGNATURE_PLAN_H
 
-#include <tarnik/xml/node.h>
 #include <vector>
+
+#include <tarnik/xml/node.h>
 
 #include "xml/security/algorithms.h"
 #include "xml/security/digest_writer.h"

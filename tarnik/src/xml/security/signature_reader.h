@@ -1,11 +1,12 @@
 #ifndef TARNIK_XML_SECURITY_SIGNATURE_READER_H
 #define TARNIK_XML_SECURITY_SIGNATURE_READER_H
 
-#include <tarnik/xml/element_node.h>
-#include <tarnik/xml/security/signature.h>
 #include <cstddef>
 #include <string>
 #include <vector>
+
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/signature.h>
 
 namespace Tarnik::Xml::Security {
 

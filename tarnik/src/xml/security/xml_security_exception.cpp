@@ -1,6 +1,6 @@
-#include <tarnik/xml/security/xml_security_exception.h>
-
 #include <utility>
+
+#include <tarnik/xml/security/xml_security_exception.h>
 
 namespace Tarnik::Xml::Security {
 

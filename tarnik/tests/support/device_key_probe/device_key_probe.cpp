@@ -1,14 +1,15 @@
 // Signs with a key of a TPM and verifies the signature. Usage: device_key_probe URI METHOD [PIN]
 // A separate program, since a loaded provider serves the whole process.
+#include <iostream>
+#include <string>
+#include <utility>
+
 #include <openssl/provider.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/xml/security/signature.h>
-
-#include <iostream>
-#include <string>
-#include <utility>
 
 namespace {
 

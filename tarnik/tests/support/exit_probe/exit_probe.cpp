@@ -1,9 +1,4 @@
 // Ends the process while the pool still has work. Usage: exit_probe SCENARIO
-#include <openssl/evp.h>
-#include <openssl/rsa.h>
-#include <tarnik/system/tcp_client_socket.h>
-#include <tarnik/system/thread_pool.h>
-
 #include <atomic>
 #include <chrono>
 #include <cstdlib>
@@ -13,6 +8,12 @@
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <openssl/evp.h>
+#include <openssl/rsa.h>
+
+#include <tarnik/system/tcp_client_socket.h>
+#include <tarnik/system/thread_pool.h>
 
 namespace {
 

@@ -1,9 +1,9 @@
 #include "xml/security/algorithms.h"
 
+#include <string>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-
-#include <string>
 
 #include "support/algorithm_uris.h"
 #include "support/signed_documents.h"

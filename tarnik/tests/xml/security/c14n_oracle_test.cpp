@@ -1,17 +1,17 @@
-#include "xml/security/c14n.h"
-
-#include <gtest/gtest.h>
-#include <tarnik/core/writer.h>
-#include <tarnik/xml/document.h>
-#include <tarnik/xml/element_node.h>
-
 #include <optional>
 #include <string>
 #include <vector>
 
+#include <gtest/gtest.h>
+
+#include <tarnik/core/writer.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
+
 #include "support/libxml2_oracle.h"
 #include "support/random_xml.h"
 #include "support/xml_text.h"
+#include "xml/security/c14n.h"
 
 namespace Tarnik::Testing {
 namespace {

@@ -1,16 +1,16 @@
-#include <tarnik/xml/security/canonicalizer.h>
+#include <string>
+#include <string_view>
+#include <vector>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/writer.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/canonicalizer.h>
 #include <tarnik/xml/security/xml_security_exception.h>
-
-#include <string>
-#include <string_view>
-#include <vector>
 
 #include "support/algorithm_uris.h"
 #include "support/thrown_message.h"

@@ -1,9 +1,9 @@
 #include "xml/security/digest_writer.h"
 
-#include <gtest/gtest.h>
-
 #include <cstddef>
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "support/algorithm_uris.h"
 

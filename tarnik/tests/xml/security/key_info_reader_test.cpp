@@ -1,10 +1,11 @@
 #include "xml/security/key_info_reader.h"
 
+#include <string>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <tarnik/xml/security/xml_security_exception.h>
 
-#include <string>
+#include <tarnik/xml/security/xml_security_exception.h>
 
 #include "support/thrown_message.h"
 #include "support/xml_text.h"

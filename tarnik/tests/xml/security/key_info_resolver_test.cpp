@@ -1,11 +1,11 @@
-#include <tarnik/xml/security/key_info_resolver.h>
-
-#include <gtest/gtest.h>
-#include <tarnik/core/exception.h>
-
 #include <cstddef>
 #include <utility>
 #include <vector>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/xml/security/key_info_resolver.h>
 
 #include "support/openssl.h"
 #include "support/test_certificates.h"

@@ -1,15 +1,16 @@
+#include <string>
+#include <tuple>
+#include <vector>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <openssl/rsa.h>
+
 #include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/crypto/public_key.h>
 #include <tarnik/text/string_util.h>
 #include <tarnik/xml/security/key_info_resolver.h>
-
-#include <string>
-#include <tuple>
-#include <vector>
 
 #include "support/algorithm_uris.h"
 #include "support/key_texts.h"

@@ -1,8 +1,9 @@
+#include <string>
+
 #include <gtest/gtest.h>
+
 #include <tarnik/xml/element_node.h>
 #include <tarnik/xml/security/signature.h>
-
-#include <string>
 
 #include "support/algorithm_uris.h"
 #include "support/new_signatures.h"

@@ -1,17 +1,18 @@
 #include "xml/security/new_signature.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <tarnik/xml/character_nodes.h>
-#include <tarnik/xml/document.h>
-#include <tarnik/xml/element_node.h>
-#include <tarnik/xml/security/signature.h>
-
 #include <atomic>
 #include <cstddef>
 #include <string>
 #include <thread>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <tarnik/xml/character_nodes.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/signature.h>
 
 #include "support/algorithm_uris.h"
 #include "support/new_signatures.h"

@@ -1,12 +1,13 @@
 #include "xml/security/reference_targets.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <tarnik/xml/element_node.h>
-#include <tarnik/xml/security/signature.h>
-
 #include <cstddef>
 #include <string>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/signature.h>
 
 #include "support/algorithm_uris.h"
 #include "support/signed_documents.h"

@@ -1,9 +1,13 @@
-#include <tarnik/xml/security/signature.h>
+#include <cstddef>
+#include <string>
+#include <utility>
+#include <vector>
 
 #include <gtest/gtest.h>
 #include <openssl/ec.h>
 #include <openssl/obj_mac.h>
 #include <openssl/rsa.h>
+
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/writer.h>
 #include <tarnik/crypto/certificate.h>
@@ -11,11 +15,7 @@
 #include <tarnik/text/string_util.h>
 #include <tarnik/xml/security/canonicalizer.h>
 #include <tarnik/xml/security/key_info_resolver.h>
-
-#include <cstddef>
-#include <string>
-#include <utility>
-#include <vector>
+#include <tarnik/xml/security/signature.h>
 
 #include "support/algorithm_uris.h"
 #include "support/openssl.h"

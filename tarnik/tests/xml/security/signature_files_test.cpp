@@ -1,10 +1,10 @@
-#include <tarnik/xml/security/signature.h>
+#include <string>
 
 #include <gtest/gtest.h>
+
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/xml/security/key_info_resolver.h>
-
-#include <string>
+#include <tarnik/xml/security/signature.h>
 
 #include "support/signed_documents.h"
 

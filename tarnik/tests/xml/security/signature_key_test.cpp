@@ -1,12 +1,13 @@
+#include <string>
+#include <utility>
+
 #include <gtest/gtest.h>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/public_key.h>
 #include <tarnik/xml/security/key_info_resolver.h>
-
-#include <string>
-#include <utility>
 
 #include "support/openssl.h"
 #include "support/signed_documents.h"

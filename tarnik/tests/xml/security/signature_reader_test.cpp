@@ -1,11 +1,11 @@
 #include "xml/security/signature_reader.h"
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
 #include <cstddef>
 #include <string>
 #include <string_view>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
 
 #include "support/signed_documents.h"
 

@@ -1,12 +1,3 @@
-#include <tarnik/xml/security/signature.h>
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <openssl/err.h>
-#include <tarnik/core/exception.h>
-#include <tarnik/text/string_util.h>
-#include <tarnik/xml/element_node.h>
-
 #include <algorithm>
 #include <atomic>
 #include <cstddef>
@@ -14,6 +5,15 @@
 #include <thread>
 #include <tuple>
 #include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <openssl/err.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/text/string_util.h>
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/security/signature.h>
 
 #include "support/openssl.h"
 #include "support/signed_documents.h"

@@ -1,9 +1,9 @@
-#include <tarnik/xml/security/xml_security_exception.h>
+#include <memory>
+#include <typeinfo>
 
 #include <gtest/gtest.h>
 
-#include <memory>
-#include <typeinfo>
+#include <tarnik/xml/security/xml_security_exception.h>
 
 namespace Tarnik::Testing {
 namespace {
