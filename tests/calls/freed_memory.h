@@ -6,7 +6,7 @@
 
 namespace SsoClient::Testing {
 
-/// Searches all memory that is released during its lifetime for a text. For this the program
+/// Searches all memory that is released during its lifetime for a text. For this, the program
 /// replaces `operator delete`. At most one object may exist at a time.
 class FreedMemory {
  public:

@@ -34,7 +34,7 @@ struct Arguments {
   std::string password = kPassword;
 };
 
-/// How an operation ended. Without an error, its class is `void`.
+/// The outcome of an operation. Without an error, its class is `void`.
 struct Outcome {
   std::shared_ptr<const SamlToken> token;
   std::optional<bool> verdict;

@@ -1,4 +1,4 @@
-// What a caller sees when the service goes wrong in the middle of a negotiation.
+// The exceptions that a caller receives when the service fails in the middle of a negotiation.
 #include <cstddef>
 #include <memory>
 #include <utility>
