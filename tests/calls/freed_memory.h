@@ -18,7 +18,7 @@ class FreedMemory {
   /// The number of blocks that held the text when they were released.
   int Finds() const { return finds_; }
 
-  void Look(const void* memory) noexcept;
+  void Search(const void* memory) noexcept;
 
  private:
   const std::string text_;

@@ -48,7 +48,7 @@ struct Outcome {
 Outcome CallNow(Operation operation, const SecurityTokenService& service,
                 const Arguments& arguments);
 
-/// Starts the asynchronous operation. `arguments.token` stays alive until the callback has run.
+/// Starts the asynchronous operation. `arguments.token` must stay alive until the callback has run.
 std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& service,
                                const Arguments& arguments);
 
