@@ -72,7 +72,7 @@ class Server::Impl {
     try {
       threads.Start(socket, context, serve, closed);
     } catch (const std::runtime_error&) {
-      closed();  // no thread could be started: the peer's connection is closed
+      closed();  // no thread could be started, and the peer's connection is closed
     }
   }
 

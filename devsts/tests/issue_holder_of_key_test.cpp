@@ -137,7 +137,8 @@ TEST(IssueHolderOfKeyTest, DelegatesToAnotherPrincipal) {
   ExpectBoundTo(holder, assertion);
 }
 
-// alice to machine to bob: the chain is in order, and the confirmation names the last delegate.
+// alice delegates to machine, and machine to bob. The chain is in this order, and the confirmation
+// names the last delegate.
 TEST(IssueHolderOfKeyTest, ByTokenWithActAsAddsTheRequesterToTheChain) {
   Server server;
   const Credential machine = server.MakeClientCredential("machine");

@@ -263,7 +263,7 @@ TEST_F(NegotiationRulesTest, FailsAtTheLegThatTheScriptNames) {
     NegotiationScript script;
     script.moreLegs = 5;
     script.failAtLeg = leg;
-    script.failure.faultString = "Told so";
+    script.failure.faultString = "As configured";
     server.SetNegotiationScript(script);
     NegotiationClient client(server);
     GssClient gss(alice, kService);
@@ -272,7 +272,7 @@ TEST_F(NegotiationRulesTest, FailsAtTheLegThatTheScriptNames) {
       EXPECT_THAT(answer, StartsWith("HTTP/1.1 200 OK\r\n"));
       answer = client.SendNext("");
     }
-    ExpectFault(answer, "wst:FailedAuthentication", "Told so");
+    ExpectFault(answer, "wst:FailedAuthentication", "As configured");
     EXPECT_EQ(server.OpenNegotiations(), 0U);
   }
 }

@@ -128,7 +128,7 @@ bool RawClient::ReadSome(std::string& text) {
   const int systemError = errno;
   ERR_clear_error();
   if (systemError == EAGAIN) {
-    throw std::runtime_error("the server does not answer");
+    throw std::runtime_error("the server did not answer");
   }
   if (systemError == ECONNRESET || systemError == EPIPE) {
     ending_ = Ending::Reset;

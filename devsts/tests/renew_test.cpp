@@ -61,7 +61,7 @@ TEST(RenewTest, GrantsTheRequestedLifetime) {
   const Credential holder = Holder();
   const std::string token = HolderToken(server, holder);
   const std::string answer = AskToRenew(server, token, holder);
-  // Two hours are requested; the token had one.
+  // Two hours are requested; the original token was valid for one.
   EXPECT_GT(ElementText(answer, "wsu:Expires"), TimeFromNow(7000));
   EXPECT_LT(ElementText(answer, "wsu:Expires"), TimeFromNow(7300));
 }

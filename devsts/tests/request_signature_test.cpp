@@ -1,4 +1,4 @@
-// The signatures of requests as a whole: what they prove, and when they are required.
+// What the signatures of requests prove, and when they are required.
 #include <chrono>
 #include <cstddef>
 #include <cstring>
@@ -157,7 +157,7 @@ TEST(RequestSignatureTest, IsRequiredIfItsPartsArePresent) {
               "wst:InvalidRequest", "Unexpected attribute Id on Body");
 }
 
-// Otherwise a requester could have a key bound to another subject's token without possessing it.
+// Otherwise, a requester could have another subject's token bound to a key that it does not have.
 TEST(RequestSignatureTest, IsNeededForAHolderOfKeyTokenByPasswordWithActAs) {
   const Server server;
   const std::string user = UsernameToken("bob@EXAMPLE.COM", "bob-secret");

@@ -1,4 +1,4 @@
-// The rules for a request's signature, each broken on its own.
+// Requests that each break one rule for signatures.
 #include <string>
 
 #include <gmock/gmock.h>

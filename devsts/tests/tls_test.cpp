@@ -81,7 +81,8 @@ TEST(TlsTest, RefusesModernClientsOverOldProtocols) {
   }
 }
 
-// The handshake of a careless client. The server must support it, or the refusals prove nothing.
+// The handshake of a client that accepts everything. The server must support it, or the refusals
+// would prove nothing.
 bool CarelessHandshake(const Server& server, int version, const char* ciphers) {
   const std::shared_ptr<SSL_CTX> context(SSL_CTX_new(TLS_client_method()), SSL_CTX_free);
   SSL_CTX_set_min_proto_version(context.get(), version);

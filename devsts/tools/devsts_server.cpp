@@ -1,5 +1,5 @@
-// Runs the service until SIGTERM or SIGINT or, with --end-with-stdin, until the end of standard
-// input, which then contains commands.
+// Runs the service until SIGTERM or SIGINT. With --end-with-stdin, also reads commands from
+// standard input, and ends when it is closed.
 #include <array>
 #include <chrono>
 #include <csignal>
@@ -205,7 +205,7 @@ void WriteFiles(const std::string& folder, DevSts::Server& server) {
   DevSts::WriteSecretFile(folder + "/client-key.pem", client.privateKeyPem);
 }
 
-// A realm in which alice has logged in and the service has a key, and alice's credential cache.
+// A realm in which alice has logged in and the service has a key, with alice's credential cache.
 struct StartedRealm {
   DevSts::KerberosRealm realm;
   std::string cache;

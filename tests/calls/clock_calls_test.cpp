@@ -1,4 +1,4 @@
-// Times that belong together are computed from one reading of the clock.
+// Related times are computed from one reading of the clock.
 #include <gmock/gmock.h>
 
 #include "calls/recorded_calls.h"

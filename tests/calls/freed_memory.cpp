@@ -18,7 +18,7 @@ std::atomic<FreedMemory*> current{nullptr};
 
 void Release(void* memory) noexcept {
   if (auto* watch = current.load(); watch != nullptr && memory != nullptr) {
-    watch->Look(memory);
+    watch->Search(memory);
   }
   std::free(memory);
 }
@@ -33,7 +33,7 @@ FreedMemory::~FreedMemory() {
   current = nullptr;
 }
 
-void FreedMemory::Look(const void* memory) noexcept {
+void FreedMemory::Search(const void* memory) noexcept {
   const std::size_t size = ::malloc_usable_size(const_cast<void*>(memory));
   if (::memmem(memory, size, text_.data(), text_.size()) != nullptr) {
     ++finds_;

@@ -6,7 +6,7 @@
 
 namespace SsoClient::Testing {
 
-/// Searches all memory that is released during its lifetime for a text. For this the program
+/// Searches all memory that is released during its lifetime for a text. For this, the program
 /// replaces `operator delete`. At most one object may exist at a time.
 class FreedMemory {
  public:
@@ -18,7 +18,7 @@ class FreedMemory {
   /// The number of blocks that held the text when they were released.
   int Finds() const { return finds_; }
 
-  void Look(const void* memory) noexcept;
+  void Search(const void* memory) noexcept;
 
  private:
   const std::string text_;

@@ -72,7 +72,7 @@ void ForgetCalls() {
 
 }  // namespace SsoClient::Testing
 
-// From here on: the functions that replace those of the libraries. The linker finds these first.
+// The functions below replace those of the libraries, because the linker finds them first.
 
 namespace SsoClient {
 

@@ -127,8 +127,8 @@ SecurityTokenServiceConfig ConfigWith(Tarnik::Ssl::SSLContext* sslContext, bool 
   return config;
 }
 
-// The fake agents return nothing that the operations understand; only the time that they wait
-// matters.
+// The fake agents return nothing that the operations understand. Only the time limit that they are
+// given is checked.
 
 TEST_F(TransportCallsTest, AServiceGivesEachExchange240SecondsAndPassesItsFlagOn) {
   for (const bool flag : {false, true}) {

@@ -24,23 +24,23 @@ using Tarnik::System::DateTime;
 class FakeToken final : public SamlToken {
  public:
   const std::string& Id() const override { return text_; }
-  const DateTime& StartTime() const override { return Note("StartTime"), start; }
-  const DateTime& ExpirationTime() const override { return Note("ExpirationTime"), end; }
+  const DateTime& StartTime() const override { return Record("StartTime"), start; }
+  const DateTime& ExpirationTime() const override { return Record("ExpirationTime"), end; }
   DateTime ExpirationTimeWithTolerance() const override { return end; }
-  const PrincipalId& Subject() const override { return Note("Subject"), subject; }
-  bool IsRenewable() const override { return Note("IsRenewable"), renewable; }
-  bool IsDelegable() const override { return Note("IsDelegable"), delegable; }
-  bool IsSolution() const override { return Note("IsSolution"), solution; }
+  const PrincipalId& Subject() const override { return Record("Subject"), subject; }
+  bool IsRenewable() const override { return Record("IsRenewable"), renewable; }
+  bool IsDelegable() const override { return Record("IsDelegable"), delegable; }
+  bool IsSolution() const override { return Record("IsSolution"), solution; }
   TokenConfirmationType ConfirmationType() const override {
-    return Note("ConfirmationType"), confirmation;
+    return Record("ConfirmationType"), confirmation;
   }
   void GetSubjectNames(SubjectNames&) const override {}
   void GetGroups(std::vector<PrincipalId>& out) const override {
-    Note("GetGroups");
+    Record("GetGroups");
     out = groups;
   }
   void GetDelegationChain(std::vector<Delegate>& out) const override {
-    Note("GetDelegationChain");
+    Record("GetDelegationChain");
     out = chain;
   }
   void GetAudiences(std::set<std::string>&) const override {}
@@ -65,7 +65,7 @@ class FakeToken final : public SamlToken {
   mutable std::vector<std::string> asked;
 
  private:
-  void Note(const char* operation) const { asked.emplace_back(operation); }
+  void Record(const char* operation) const { asked.emplace_back(operation); }
 
   std::string text_ = "SECRET";
 };

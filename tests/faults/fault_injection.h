@@ -4,8 +4,8 @@
 #include <cstddef>
 
 /// Makes one call of a kind fail: an allocation by operator new or by the library's calls of
-/// malloc, which supply Expat's memory, or an OpenSSL call that digests, verifies or signs. For one
-/// thread at a time.
+/// malloc, which provide Expat's memory, or an OpenSSL call that digests, verifies or signs. For
+/// one thread at a time.
 namespace SsoClient::Testing {
 
 enum class FaultKind { kAllocation, kCrypto };

@@ -16,8 +16,8 @@
 #include "faults/fault_injection.h"
 #include "support/parse_xml.h"
 
-// One call fails while a signature is made: the signature is blank again, and signing it once more
-// gives a signature that an independent verifier accepts.
+// If a call fails while a signature is made, the signature is blank again, and signing once more
+// results in a signature that an independent verifier accepts.
 namespace SsoClient::Testing {
 namespace {
 
@@ -40,7 +40,7 @@ class SigningFaultsTest : public testing::Test {
  protected:
   SigningFaultsTest() : signer_(MakeSigner()) {
     key_ = CreatePrivateKeyFromPem(signer_.privateKeyPem);
-    // What is set up once per key or per process is not under test.
+    // Set up once per key or per process before the test, so that no call fails there.
     Prepare();
     EXPECT_EQ(Sign(), Outcome::kSigned);
   }
@@ -110,12 +110,12 @@ TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenMemoryRunsOut) {
 
 TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenTheCryptographicLibraryFails) {
   for (const int result : {0, -1}) {
-    // Two digests of three calls or more, and one signature.
+    // Two digests with at least three calls each, and one signature.
     EXPECT_GE(FailEachCall(FaultKind::kCrypto, result, Outcome::kRefused), 7U);
   }
 }
 
-// Each construction step fails in turn: nothing leaks, and no partly built object is returned.
+// Whichever construction step fails, nothing leaks, and no incomplete object is returned.
 TEST_F(SigningFaultsTest, LeakNothingWhenASignatureCannotBeCreated) {
   std::size_t failures = 0;
   for (bool happened = true; happened; ++failures) {

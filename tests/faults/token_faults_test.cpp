@@ -14,8 +14,8 @@
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
 
-// One call fails while a token is read and verified: a forged token is never accepted, a good one
-// is never accepted for the wrong reason, and nothing leaks.
+// If a call fails while a token is read and verified, a forged token is never accepted, a valid one
+// is accepted only if its signature was verified, and nothing leaks.
 namespace SsoClient::Testing {
 namespace {
 
@@ -48,7 +48,7 @@ std::vector<Forgery> Forgeries() {
 
 class TokenFaultsTest : public testing::Test {
  protected:
-  // What is set up once per process is not under test.
+  // Set up once per process before the test, so that no call fails there.
   void SetUp() override { ASSERT_EQ(VerdictOn(original_, resolver_.get()), Verdict::kAccepted); }
 
   const std::string original_ = OriginalAssertion();
@@ -94,7 +94,7 @@ TEST_P(CryptoFaultsTest, MakeVerificationFail) {
     happened = fault.HasHappened();
     ASSERT_EQ(verdict, happened ? Verdict::kRefused : Verdict::kAccepted) << calls;
   }
-  // Two digests of three calls or more, and one verification.
+  // Two digests with at least three calls each, and one verification.
   EXPECT_GE(calls, 8U);
 }
 

@@ -1,4 +1,4 @@
-// Ends while calls are under way: exit_probe URL CA_FILE SIGNING_CERTIFICATE_FILE MICROSECONDS
+// Ends while calls are in progress: exit_probe URL CA_FILE SIGNING_CERTIFICATE_FILE MICROSECONDS
 #include <chrono>
 #include <cstdlib>
 #include <thread>

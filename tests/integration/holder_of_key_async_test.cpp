@@ -122,15 +122,15 @@ INSTANTIATE_TEST_SUITE_P(Operations, EveryOperationAsyncTest, testing::ValuesIn(
                          [](const auto& tested) { return NameOf(tested.param); });
 
 /// One way to fail.
-struct Trouble {
+struct FailureCase {
   const char* name;
   std::type_index errorClass;
-  /// How the message begins; the rest is compared with that of the synchronous operation.
+  /// The start of the message; the rest is compared with that of the synchronous operation.
   const char* message;
   void (*prepare)(DevSts::Server& server, Arguments& arguments);
   /// Operations that it does not affect succeed.
-  bool concernsVerdicts = true;
-  bool concernsRenewal = true;
+  bool affectsValidation = true;
+  bool affectsRenewal = true;
 };
 
 void AnswerFault(DevSts::Server& server, const char* code, const char* text) {
@@ -145,7 +145,7 @@ void EditTokens(DevSts::Server& server, std::function<void(std::string&)> edit) 
   server.SetAssertionOptions(options);
 }
 
-/// Replaces the certificate that a token is bound to with another text.
+/// Replaces the certificate that tokens are bound to with this text.
 void EditHolderCertificate(DevSts::Server& server, const std::string& text) {
   EditTokens(server, [text](std::string& xml) {
     constexpr std::string_view kElement = "<ds:X509Certificate>";
@@ -155,33 +155,33 @@ void EditHolderCertificate(DevSts::Server& server, const std::string& text) {
 }
 
 class FailureAsyncTest : public HolderOfKeyTest,
-                         public testing::WithParamInterface<std::tuple<Operation, Trouble>> {};
+                         public testing::WithParamInterface<std::tuple<Operation, FailureCase>> {};
 
 TEST_P(FailureAsyncTest, EqualsThatOfTheSynchronousOperation) {
-  const auto& [operation, trouble] = GetParam();
+  const auto& [operation, failure] = GetParam();
   Arguments arguments;
   arguments.token = AcquireBound();
-  trouble.prepare(Sts(), arguments);
+  failure.prepare(Sts(), arguments);
   const auto service = HolderService();
   const Outcome thrown = CallNow(operation, *service, arguments);
   const Outcome arrived = AwaitCall(operation, *service, arguments);
 
   EXPECT_EQ(arrived.errorClass, thrown.errorClass);
   EXPECT_EQ(arrived.message, thrown.message);
-  const bool isConcerned = operation == Operation::Validate ? trouble.concernsVerdicts
-                           : operation == Operation::Renew  ? trouble.concernsRenewal
-                                                            : true;
-  if (!isConcerned) {
+  const bool isAffected = operation == Operation::Validate ? failure.affectsValidation
+                          : operation == Operation::Renew  ? failure.affectsRenewal
+                                                           : true;
+  if (!isAffected) {
     EXPECT_TRUE(arrived.IsSuccess()) << arrived.message;
     return;
   }
-  EXPECT_EQ(arrived.errorClass, trouble.errorClass) << arrived.errorClass.name();
-  EXPECT_THAT(arrived.message, StartsWith(trouble.message));
+  EXPECT_EQ(arrived.errorClass, failure.errorClass) << arrived.errorClass.name();
+  EXPECT_THAT(arrived.message, StartsWith(failure.message));
   EXPECT_EQ(arrived.token, nullptr);
   EXPECT_EQ(arrived.verdict, std::nullopt);
 }
 
-std::vector<Trouble> Troubles() {
+std::vector<FailureCase> FailureCases() {
   return {
       {"InvalidArgument", typeid(Tarnik::InvalidArgumentException),
        "Token lifetime must be positive",
@@ -239,7 +239,7 @@ std::vector<Trouble> Troubles() {
 
 INSTANTIATE_TEST_SUITE_P(EveryOperation, FailureAsyncTest,
                          testing::Combine(testing::ValuesIn(kOperations),
-                                          testing::ValuesIn(Troubles())),
+                                          testing::ValuesIn(FailureCases())),
                          [](const auto& tested) {
                            return std::string(NameOf(std::get<0>(tested.param))) +
                                   std::get<1>(tested.param).name;

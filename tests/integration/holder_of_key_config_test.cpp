@@ -115,8 +115,8 @@ struct PeriodCase {
   const char* name;
   seconds notBefore;
   seconds notAfter;
-  /// How the message ends; empty if the request is sent.
-  const char* complaint;
+  /// The end of the message; empty if the request is sent.
+  const char* reason;
 };
 
 class CertificatePeriodTest : public HolderOfKeyTest,
@@ -139,7 +139,7 @@ class OutOfPeriodTest : public CertificatePeriodTest {};
 TEST_P(OutOfPeriodTest, FailsEverySignatureAndSendsNothing) {
   const auto certificate = ConfigOf(credential_).certificate;
   const std::string expected =
-      "The holder-of-key certificate of `CN=holder' " + std::string(GetParam().complaint) +
+      "The holder-of-key certificate of `CN=holder' " + std::string(GetParam().reason) +
       (GetParam().notAfter < seconds(0) ? certificate->NotAfter() : certificate->NotBefore())
           .ToString();
   for (const Operation operation :
@@ -167,7 +167,7 @@ INSTANTIATE_TEST_SUITE_P(
                     PeriodCase{"JustAhead", seconds(660), hours(1), "is not valid before "}),
     [](const auto& tested) { return tested.param.name; });
 
-// Clocks differ, so shortly before and after the period the service decides.
+// Clocks differ, so shortly before and after the period the decision is left to the service.
 class NearPeriodTest : public CertificatePeriodTest {};
 
 TEST_P(NearPeriodTest, IsLeftToTheService) {

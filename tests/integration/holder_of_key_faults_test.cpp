@@ -1,4 +1,4 @@
-// How refusals of holder-of-key operations by the service reach the caller.
+// The exceptions that a caller receives when the service refuses holder-of-key operations.
 #include <chrono>
 #include <memory>
 #include <optional>
@@ -29,7 +29,7 @@ class HolderOfKeyFaultTest : public HolderOfKeyTest {
     EXPECT_EQ(outcome.message, message);
     EXPECT_EQ(outcome.token, nullptr);
   }
-  /// The service gives the reason in its fault, and the caller sees it.
+  /// Expects that the service gives this reason in its fault, and that the exception contains it.
   static void ExpectRejected(const Outcome& outcome, const std::string& fault) {
     ExpectFailure(outcome, typeid(InvalidCredentialsException), "Authentication failed: " + fault);
   }
@@ -73,7 +73,7 @@ TEST_F(HolderOfKeyFaultTest, ProvenKeyDoesNotReplaceThePassword) {
 
 struct PresentedCase {
   Operation operation;
-  /// How the service names the presented token.
+  /// The name of the presented token in the service's faults.
   const char* place;
 };
 
@@ -141,7 +141,7 @@ TEST_F(HolderOfKeyFaultTest, TokenThatHasNotBegunIsRefused) {
 
 TEST_F(HolderOfKeyFaultTest, KeyOtherThanTheTokensIsRefused) {
   const auto token = AcquireBound();
-  // The token names the verification key, and the request is signed with another one.
+  // The token names the verification key, but the request is signed with another one.
   ExpectUnexpectedFault(Present(Operation::Token, token, Stranger()), "wsse:FailedCheck");
   ExpectRejected(Present(Operation::Renew, token, Stranger()),
                  "The request is not signed by the key of the RenewTarget");

@@ -25,7 +25,7 @@ const DevSts::Credential& Stranger();
 DevSts::Credential HolderValidBetween(std::chrono::seconds notBefore,
                                       std::chrono::seconds notAfter);
 
-/// As `MakeService`, with the credential's holder-of-key configuration.
+/// Like `MakeService`, with the credential as holder-of-key configuration.
 std::shared_ptr<SecurityTokenService> MakeHolderService(const DevSts::Server& server,
                                                         const std::string& url,
                                                         const DevSts::Credential& credential);

@@ -34,7 +34,7 @@ struct Arguments {
   std::string password = kPassword;
 };
 
-/// How an operation ended. Without an error, its class is `void`.
+/// The outcome of an operation. Without an error, its class is `void`.
 struct Outcome {
   std::shared_ptr<const SamlToken> token;
   std::optional<bool> verdict;
@@ -48,7 +48,7 @@ struct Outcome {
 Outcome CallNow(Operation operation, const SecurityTokenService& service,
                 const Arguments& arguments);
 
-/// Starts the asynchronous operation. `arguments.token` stays alive until the callback has run.
+/// Starts the asynchronous operation. `arguments.token` must stay alive until the callback has run.
 std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& service,
                                const Arguments& arguments);
 

@@ -147,8 +147,8 @@ TEST_P(OperationLogTest, ByDefaultSuccessAndFailureAreSilent) {
   EXPECT_THAT(log.Lines(), IsEmpty());
 }
 
-/// Pieces of everything that must stay secret: the password, the private key and the text of every
-/// token that took part.
+/// Parts of everything that must stay secret: the password, the private key and the text of every
+/// token that was used.
 std::vector<std::string> SecretsOf(const Arguments& arguments, const Outcome& outcome) {
   std::vector<std::string> secrets = {arguments.password, "PRIVATE KEY", "<saml2", "<wsse"};
   const std::string pem = Holder().privateKeyPem;
@@ -165,7 +165,7 @@ std::vector<std::string> SecretsOf(const Arguments& arguments, const Outcome& ou
   return secrets;
 }
 
-/// How an operation ends, if that is the same for all of them.
+/// How the operations end; `Either` if not all end in the same way.
 enum class End { Success, Failure, Either };
 
 /// What happens to a request or an answer in transit.

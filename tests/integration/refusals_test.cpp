@@ -125,7 +125,7 @@ TEST_F(RefusalTest, GarbageInsteadOfHttpIsACommunicationFailure) {
 }
 
 TEST_F(RefusalTest, PortThatNoProcessListensOnIsNamed) {
-  // A port that was free a moment ago and that no process listens on.
+  // A socket that is bound to a free port and does not listen.
   const int probe = socket(AF_INET, SOCK_STREAM, 0);
   sockaddr_in address{};
   address.sin_family = AF_INET;

@@ -79,7 +79,8 @@ TEST_F(RenewTokenTest, TokenThatIsNotRenewableIsRefusedByTheService) {
   EXPECT_EQ(RefusalOf(*AcquireBound(TenMinutes())), "The RenewTarget is not renewable");
 }
 
-// The client requests a lifetime that begins now, so this right is not used, but passed on.
+// The client requests a lifetime that begins now, so the new token is not postdated. It keeps the
+// right to be postdated.
 TEST_F(RenewTokenTest, PostdatableTokenBeginsNowAndStaysPostdatable) {
   for (const bool postdatable : {false, true}) {
     DevSts::AssertionOptions options;

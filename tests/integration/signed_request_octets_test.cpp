@@ -1,4 +1,5 @@
-// Signed requests as they arrive, verified by another implementation of XML signatures.
+// Signed requests as the service receives them, verified by another implementation of XML
+// signatures.
 #include <memory>
 #include <set>
 #include <string>
@@ -21,7 +22,7 @@ namespace {
 using testing::ElementsAre;
 using testing::StartsWith;
 
-/// The place of a text in a signed request.
+/// Where a text is in a signed request.
 enum class Place { UserName, Password, Audience, AdviceSource, AdviceName, AdviceValue, Delegate };
 
 struct TextCase {
@@ -65,7 +66,7 @@ Arguments ArgumentsWith(Place place, const std::string& text) {
   return arguments;
 }
 
-/// The text as the issued token returns it, if it does.
+/// The text in the issued token, or the original one if the token does not contain it.
 std::string TextOf(Place place, const SamlToken& token, const Arguments& arguments) {
   std::set<std::string> audiences;
   token.GetAudiences(audiences);
@@ -157,8 +158,8 @@ INSTANTIATE_TEST_SUITE_P(
 /// target.
 class TravellingTokenTest : public HolderOfKeyTest, public testing::WithParamInterface<TextCase> {
  protected:
-  /// The assertion in the last request is still valid as its issuer signed it when taken out of the
-  /// request.
+  /// Expects that the assertion's signature is still valid when the assertion is extracted from the
+  /// last request.
   static void ExpectIntact(const SamlToken& token) {
     const std::string sent = AssertionIn(Sts().LastRequest().body);
     const std::string signer = Sts().SigningCertificatePem();
@@ -175,13 +176,13 @@ class TravellingTokenTest : public HolderOfKeyTest, public testing::WithParamInt
     EXPECT_TRUE(advice.at(0).source == GetParam().text);
     EXPECT_TRUE(advice.at(0).attributes.at(0).values.at(0) == GetParam().text);
   }
-  static TokenSpec Talkative() {
+  static TokenSpec SpecWithAdvice() {
     TokenSpec spec = RenewableAndDelegable();
     spec.advice = {{GetParam().text, {{"urn:name", {GetParam().text}}}}};
     return spec;
   }
-  static std::shared_ptr<const SamlToken> TalkativeBearer() {
-    TokenSpec spec = Talkative();
+  static std::shared_ptr<const SamlToken> BearerWithAdvice() {
+    TokenSpec spec = SpecWithAdvice();
     spec.confirmation = CONFIRMATION_BEARER;
     return Acquire(spec);
   }
@@ -189,21 +190,21 @@ class TravellingTokenTest : public HolderOfKeyTest, public testing::WithParamInt
 
 TEST_P(TravellingTokenTest, IsTheActAsTokenOfARequestSignedByCertificate) {
   TokenSpec spec = TenMinutes();
-  spec.actAsToken = TalkativeBearer();
+  spec.actAsToken = BearerWithAdvice();
   HolderService()->AcquireTokenByCertificate(spec);
   ExpectVerifies(Sts().LastRequest().body);
   ExpectIntact(**spec.actAsToken);
 }
 
 TEST_P(TravellingTokenTest, IsPresentedInTheHeader) {
-  const auto token = AcquireBound(Talkative());
+  const auto token = AcquireBound(SpecWithAdvice());
   HolderService()->AcquireTokenByToken(*token, TenMinutes());
   EXPECT_EQ(Sts().LastRequest().signature, DevSts::RequestSignature::ByToken);
   ExpectIntact(*token);
 }
 
 TEST_P(TravellingTokenTest, IsRenewed) {
-  const auto token = AcquireBound(Talkative());
+  const auto token = AcquireBound(SpecWithAdvice());
   const auto renewed = HolderService()->RenewToken(*token, 60);
   ExpectVerifies(Sts().LastRequest().body);
   ExpectIntact(*token);
@@ -213,18 +214,18 @@ TEST_P(TravellingTokenTest, IsRenewed) {
 }
 
 TEST_P(TravellingTokenTest, IsValidated) {
-  for (const auto& token : {AcquireBound(Talkative()), TalkativeBearer()}) {
+  for (const auto& token : {AcquireBound(SpecWithAdvice()), BearerWithAdvice()}) {
     EXPECT_TRUE(HolderService()->ValidateSubject(*token));
     ExpectIntact(*token);
   }
 }
 
-// Two assertions in one request: the presented one proves the key, the other names the subject to
-// act for.
+// There are two assertions in the request: the presented one proves the key, and the other one
+// names the subject to act for.
 TEST_P(TravellingTokenTest, IsPresentedTogetherWithAnActAsToken) {
-  const auto token = AcquireBound(Talkative());
+  const auto token = AcquireBound(SpecWithAdvice());
   TokenSpec spec = TenMinutes();
-  spec.actAsToken = TalkativeBearer();
+  spec.actAsToken = BearerWithAdvice();
   EXPECT_NE(HolderService()->AcquireTokenByToken(*token, spec), nullptr);
   ExpectIntact(*token);
   const std::string body = Sts().LastRequest().body;

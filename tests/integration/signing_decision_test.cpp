@@ -1,4 +1,4 @@
-// What each operation signs and requests, checked in the octets that arrive.
+// What each operation signs and requests, checked in the octets that the service receives.
 #include <string>
 #include <typeindex>
 #include <typeinfo>
@@ -22,12 +22,12 @@ using Names = std::vector<std::string>;
 
 constexpr char kProof[] = "holderOfKeyProofSignature";
 
-/// What arrives, or why nothing arrives.
+/// The properties of the received request, or the reason why none is sent.
 struct Expected {
   Names securityEntries;
   std::string keyType;
   std::string useKey;
-  /// The local failure, `void` if the request is sent.
+  /// The class of the local failure; `void` if the request is sent.
   std::type_index failure = typeid(void);
   std::string message = {};
 };
@@ -51,7 +51,7 @@ struct Cell {
   const char* name;
   Operation operation;
   bool hasKey;
-  /// Of the spec; for operations without one, of the presented token.
+  /// The confirmation in the spec or, for operations without a spec, of the presented token.
   bool isBearer;
   bool actsAs;
   Expected expected;

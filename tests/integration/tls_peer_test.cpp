@@ -13,7 +13,7 @@ struct PeerCase {
   const char* name;
   DevSts::TlsOptions tls;
   const char* urlHost;
-  const char* reason;  ///< in the message; null if the token is acquired
+  const char* reason;  ///< part of the message; null if the token is acquired
 };
 
 DevSts::TlsOptions With(ServerCertificate certificate) {

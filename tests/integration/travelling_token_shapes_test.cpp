@@ -1,4 +1,5 @@
-// Assertions of other shapes keep valid signatures when they are sent in requests.
+// The signatures of assertions in unusual forms remain valid when the assertions are sent in
+// requests.
 #include <memory>
 #include <string>
 #include <utility>
@@ -91,7 +92,7 @@ INSTANTIATE_TEST_SUITE_P(
                           }}),
     [](const auto& tested) { return tested.param.name; });
 
-/// Tokens that a caller has from other places than the answer of this service.
+/// Tokens that a caller does not use directly as received from the service.
 class StoredTokenTest : public HolderOfKeyTest {
  protected:
   static void ExpectAccepted(std::shared_ptr<const SamlToken> token) {

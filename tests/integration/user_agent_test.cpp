@@ -1,4 +1,4 @@
-// Holder-of-key operations over the caller's user agent and connections.
+// Holder-of-key operations over a user agent and connections of the caller.
 #include <chrono>
 #include <cstdint>
 #include <future>

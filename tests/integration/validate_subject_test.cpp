@@ -1,4 +1,4 @@
-// Verdicts over real TLS.
+// Validation over real TLS.
 #include <chrono>
 #include <string>
 
@@ -18,7 +18,7 @@ using testing::HasSubstr;
 
 class ValidateSubjectTest : public HolderOfKeyTest {
  protected:
-  // With and without a holder-of-key configuration, which must make no difference.
+  // Validates with and without a holder-of-key configuration, which must not make a difference.
   static bool IsValid(const SamlToken& token) {
     const bool verdict = Service()->ValidateSubject(token);
     EXPECT_EQ(HolderService()->ValidateSubject(token), verdict);

@@ -6,11 +6,11 @@
 
 namespace SsoClient::Testing {
 
-/// What distinguishes requests, read from the octets that a server received.
+/// The properties that distinguish requests, read from the octets that a server received.
 struct WireRequest {
   /// Local names of the entries of the Security header, in order.
   std::vector<std::string> securityEntries;
-  /// The local name of what the SecurityTokenReference of the signature's KeyInfo holds; empty
+  /// The local name of the child of the SecurityTokenReference in the signature's KeyInfo; empty
   /// without a signature.
   std::string keyReference;
   /// "PublicKey" or "Bearer"; empty without a KeyType.

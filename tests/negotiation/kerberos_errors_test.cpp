@@ -36,7 +36,7 @@ TEST_F(KerberosErrorsTest, UnknownService) {
   EXPECT_THAT(Failure(config), HasSubstr("not found in Kerberos database"));
 }
 
-// Each test has its own KDC, since it breaks it.
+// Restores the KDC, which each test stops or runs with a wrong clock.
 class BrokenRealmTest : public KerberosErrorsTest {
  protected:
   ~BrokenRealmTest() override { Realm().SetClock(0s); }

@@ -1,4 +1,4 @@
-// What a caller sees when the service goes wrong in the middle of a negotiation.
+// The exceptions that a caller receives when the service fails in the middle of a negotiation.
 #include <cstddef>
 #include <memory>
 #include <utility>
@@ -93,11 +93,11 @@ TEST_F(NegotiationFaultsTest, ALateFailureIsTheServicesFault) {
   script.failAtLeg = 2;
   Sts().SetNegotiationScript(script);
   EXPECT_THAT(MessageOf<InvalidCredentialsException>(LogIn),
-              HasSubstr("The negotiation was told to fail"));
+              HasSubstr("The negotiation is configured to fail"));
   const auto context = Context();
   const auto handler = Alice();
   EXPECT_THAT(MessageOf<InvalidCredentialsException>([&] { LogInByContext(*context, *handler); }),
-              HasSubstr("The negotiation was told to fail"));
+              HasSubstr("The negotiation is configured to fail"));
 }
 
 TEST_F(NegotiationFaultsTest, AServiceThatRequiresACookieItNeverSetRefuses) {

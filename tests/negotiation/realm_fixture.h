@@ -16,7 +16,7 @@
 
 namespace SsoClient::Testing {
 
-/// The dev STS's name in the realm.
+/// The name of the dev STS in the realm.
 inline constexpr char kTarget[] = "HTTP@sts.example";
 
 /// A negotiation of two legs.
@@ -36,7 +36,7 @@ class RealmTest : public testing::Test {
   static std::shared_ptr<SecurityTokenService> Service();
   static std::shared_ptr<SecurityTokenService> HolderService();
   static std::shared_ptr<InternalApi::GssNegotiationContext> Context();
-  /// Makes alice's legs.
+  /// The configuration of a handler that creates alice's legs.
   static GssapiNegotiationConfig AsAlice();
   static GssapiNegotiationConfig AsMachine();
   static std::shared_ptr<GssapiNegotiationHandler> Alice() {

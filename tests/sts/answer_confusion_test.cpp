@@ -11,7 +11,7 @@
 #include "sts/answers.h"
 #include "sts/response_handler.h"
 
-// Answers of one operation given to another.
+// The answer of one operation is given to the parser of another.
 namespace SsoClient::Testing {
 namespace {
 

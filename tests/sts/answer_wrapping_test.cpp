@@ -16,8 +16,8 @@
 #include "support/assertion_text.h"
 #include "support/forgeries.h"
 
-// Forged assertions in the answers of a service: whatever part of an answer the client reads, it
-// never accepts a forged assertion as a token.
+// The client never accepts a forged assertion as a token, wherever it is in an answer of the
+// service.
 namespace SsoClient::Testing {
 namespace {
 
@@ -92,8 +92,8 @@ INSTANTIATE_TEST_SUITE_P(Arrangements, AnswerWrappingTest,
                          testing::Combine(testing::ValuesIn(AllForgedIds()),
                                           testing::ValuesIn(AllForgedSignatures())));
 
-// Without verification the same answers return the forged assertion. So the tests above fail
-// because of the signature.
+// Without verification, the same answers return the forged assertion. So in the tests above the
+// forgeries are refused because of the signature.
 TEST(AnswerWrappingControlTest, ReadsForgeriesWhenNothingIsVerified) {
   const std::string original = OriginalAssertion();
   const std::string forged = ForgedAssertion(ForgedId::kNew, ForgedSignature::kStranger, original);

@@ -30,7 +30,7 @@ using Tarnik::InvalidStateException;
 using Tarnik::System::DateTime;
 using Tarnik::System::GetUtcDateTime;
 
-std::string Complaint(const HolderOfKeyConfig& config) {
+std::string ErrorMessage(const HolderOfKeyConfig& config) {
   return ThrownMessage<InvalidArgumentException>([&] { CheckHolderOfKeyConfig(config); });
 }
 
@@ -42,23 +42,23 @@ TEST(HolderOfKeyCheckTest, AcceptsNoConfigurationAndAMatchingOne) {
 TEST(HolderOfKeyCheckTest, RefusesNullParts) {
   auto config = ConfigOf(KeyCredential());
   config.privateKey = nullptr;
-  EXPECT_EQ(Complaint(config), "HolderOfKeyConfig: the private key must not be null.");
+  EXPECT_EQ(ErrorMessage(config), "HolderOfKeyConfig: the private key must not be null.");
   config.certificate = nullptr;
-  EXPECT_EQ(Complaint(config), "HolderOfKeyConfig: the certificate must not be null.");
+  EXPECT_EQ(ErrorMessage(config), "HolderOfKeyConfig: the certificate must not be null.");
 }
 
 TEST(HolderOfKeyCheckTest, RefusesAKeyOfAnotherCertificate) {
   auto config = ConfigOf(KeyCredential());
   config.privateKey = ConfigOf(KeyCredential(DevSts::KeyType::Rsa3072)).privateKey;
-  EXPECT_EQ(Complaint(config),
+  EXPECT_EQ(ErrorMessage(config),
             "HolderOfKeyConfig: the private key does not belong to the certificate.");
 }
 
 TEST(HolderOfKeyCheckTest, RefusesKeysThatCannotSign) {
-  EXPECT_EQ(Complaint(ConfigOf(KeyCredential(DevSts::KeyType::EcP256))),
+  EXPECT_EQ(ErrorMessage(ConfigOf(KeyCredential(DevSts::KeyType::EcP256))),
             "HolderOfKeyConfig: the key must be an RSA key, since requests are signed with "
             "RSA-SHA256.");
-  EXPECT_EQ(Complaint(ConfigOf(KeyCredential(DevSts::KeyType::Rsa1024))),
+  EXPECT_EQ(ErrorMessage(ConfigOf(KeyCredential(DevSts::KeyType::Rsa1024))),
             "HolderOfKeyConfig: the RSA key must have at least 2048 bits.");
 }
 
@@ -94,19 +94,19 @@ class ForeignKey final : public Tarnik::Crypto::PrivateKey, public Tarnik::Objec
 TEST(HolderOfKeyCheckTest, RefusesCertificatesThatHoldNoKey) {
   auto config = ConfigOf(KeyCredential());
   config.certificate = Tarnik::MakeRef<const ForeignCertificate>("");
-  EXPECT_EQ(Complaint(config),
+  EXPECT_EQ(ErrorMessage(config),
             "HolderOfKeyConfig: the certificate cannot be used: A certificate cannot be empty.");
   config.certificate = Tarnik::MakeRef<const ForeignCertificate>("no DER");
-  EXPECT_THAT(Complaint(config),
+  EXPECT_THAT(ErrorMessage(config),
               testing::StartsWith("HolderOfKeyConfig: the certificate cannot be used: The "
                                   "certificate cannot be decoded: "));
   const auto genuine = ConfigOf(KeyCredential()).certificate;
   std::string unknownKind(reinterpret_cast<const char*>(genuine->DerBytes()), genuine->DerLength());
-  // The object identifier of RSA keys, with another last arc.
+  // The object identifier of RSA keys with another last component.
   const std::string rsa("\x2a\x86\x48\x86\xf7\x0d\x01\x01\x01", 9);
   unknownKind.replace(unknownKind.find(rsa) + 8, 1, "\x7f");
   config.certificate = Tarnik::MakeRef<const ForeignCertificate>(unknownKind);
-  EXPECT_EQ(Complaint(config),
+  EXPECT_EQ(ErrorMessage(config),
             "HolderOfKeyConfig: the certificate cannot be used: The certificate's public key is "
             "broken or of an unknown kind.");
 }
@@ -114,10 +114,10 @@ TEST(HolderOfKeyCheckTest, RefusesCertificatesThatHoldNoKey) {
 TEST(HolderOfKeyCheckTest, RefusesAForeignKeyWithoutAPublicHalf) {
   auto config = ConfigOf(KeyCredential());
   config.privateKey = Tarnik::MakeRef<const ForeignKey>();
-  EXPECT_EQ(Complaint(config), "HolderOfKeyConfig: the private key has no public half.");
+  EXPECT_EQ(ErrorMessage(config), "HolderOfKeyConfig: the private key has no public half.");
 }
 
-std::string PeriodComplaint(const Tarnik::Crypto::Certificate& certificate, const DateTime& now) {
+std::string PeriodError(const Tarnik::Crypto::Certificate& certificate, const DateTime& now) {
   return ThrownMessage<InvalidStateException>([&] { CheckPeriodOfValidity(certificate, now); });
 }
 
@@ -128,13 +128,13 @@ DateTime Later(const DateTime& time, long seconds) {
 TEST(HolderOfKeyCheckTest, ChecksThePeriodOfValidityWithTenMinutesOfTolerance) {
   const auto certificate = ConfigOf(KeyCredential()).certificate;
   const std::string accepted = "Nothing was thrown.";
-  EXPECT_EQ(PeriodComplaint(*certificate, GetUtcDateTime()), accepted);
-  EXPECT_EQ(PeriodComplaint(*certificate, Later(certificate->NotBefore(), -600)), accepted);
-  EXPECT_EQ(PeriodComplaint(*certificate, Later(certificate->NotAfter(), 600)), accepted);
-  EXPECT_EQ(PeriodComplaint(*certificate, Later(certificate->NotBefore(), -601)),
+  EXPECT_EQ(PeriodError(*certificate, GetUtcDateTime()), accepted);
+  EXPECT_EQ(PeriodError(*certificate, Later(certificate->NotBefore(), -600)), accepted);
+  EXPECT_EQ(PeriodError(*certificate, Later(certificate->NotAfter(), 600)), accepted);
+  EXPECT_EQ(PeriodError(*certificate, Later(certificate->NotBefore(), -601)),
             "The holder-of-key certificate of `" + certificate->SubjectName() +
                 "' is not valid before " + certificate->NotBefore().ToString());
-  EXPECT_EQ(PeriodComplaint(*certificate, Later(certificate->NotAfter(), 601)),
+  EXPECT_EQ(PeriodError(*certificate, Later(certificate->NotAfter(), 601)),
             "The holder-of-key certificate of `" + certificate->SubjectName() + "' expired at " +
                 certificate->NotAfter().ToString());
 }

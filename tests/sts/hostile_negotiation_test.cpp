@@ -43,7 +43,7 @@ class ListeningHandler final : public NegotiationHandler {
   std::vector<Leg> received;
 };
 
-/// With the loop, or with a context that is called until it has a token.
+/// Logs in with the loop, or with a context that is called until it has a token.
 class HostileNegotiationTest : public testing::TestWithParam<bool> {
  protected:
   void Answer(std::vector<std::string> answers) {
@@ -86,7 +86,7 @@ std::string ContextIn(const std::string& request) {
   return std::string(message->FindAttribute("Context").value_or("no Context"));
 }
 
-// As it is written in an answer, and its value.
+// The text in an answer, and its value.
 struct ContextId {
   std::string written;
   std::string meant;

@@ -146,7 +146,7 @@ TEST(RequestBuilderImplTest, TheOperationIsTheFirstSlot) {
 constexpr char kMarkup[] =
     "</a>&amp;&#0;<!--c--><?p?>]]><![CDATA[\"'\r\n\t\xC3\xA4\xF0\x9F\x94\x91 ";
 
-// As Canonical XML (section 2.3) writes it in a text and in an attribute.
+// The form in which Canonical XML (section 2.3) writes it in a text and in an attribute.
 constexpr char kInText[] =
     "&lt;/a&gt;&amp;amp;&amp;#0;&lt;!--c--&gt;&lt;?p?&gt;]]&gt;&lt;![CDATA[\"'&#xD;\n\t"
     "\xC3\xA4\xF0\x9F\x94\x91 ";

@@ -62,7 +62,7 @@ std::string StatusAnswer(const std::string& code) {
 constexpr char kValid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid";
 constexpr char kInvalid[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid";
 
-// What every operation does before it reads the body.
+// The steps of every operation before it reads the body.
 
 TEST(ResponseHandlerImplTest, AnAnswerThatIsNotXmlIsRefusedWithTheReason) {
   for (const auto& [name, parse] : AllParsers()) {

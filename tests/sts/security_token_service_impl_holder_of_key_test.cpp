@@ -157,7 +157,7 @@ TEST(HolderOfKeyOperationsAsyncTest, TokensReachTheCallback) {
   AsyncCall byCertificate;
   AsyncCall byToken;
   AsyncCall renewal;
-  // The services are released at once.
+  // The services are released immediately.
   issuing.Service()->AcquireTokenByCertificateAsync(OneHour(), byCertificate.Callback());
   issuing.Service()->AcquireTokenByTokenAsync(presented, OneHour(), byToken.Callback());
   renewing.Service()->RenewTokenAsync(presented, 60, renewal.Callback());

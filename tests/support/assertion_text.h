@@ -21,14 +21,14 @@ std::string Replaced(std::string text, std::string_view from, std::string_view t
 /// `text` with `addition` after the only occurrence of `anchor`.
 std::string InsertedAfter(std::string text, std::string_view anchor, std::string_view addition);
 
-/// The time `seconds` after `now` as assertions write it.
+/// The time `seconds` after `now` in the form that assertions use.
 std::string TimeText(const Tarnik::System::DateTime& now, long seconds);
 
 /// A well-formed ds:Signature with made-up values.
 std::string MadeUpSignature(std::string_view referenceUri);
 
-/// A bearer assertion in parts, which a test may change before they are joined. Valid from one
-/// minute before `now` to one hour after it.
+/// The parts of a bearer assertion, which a test may change before they are joined. The assertion
+/// is valid from one minute before `now` to one hour after it.
 struct AssertionText {
   explicit AssertionText(const Tarnik::System::DateTime& now = Tarnik::System::GetUtcDateTime());
 
@@ -45,7 +45,7 @@ struct AssertionText {
   /// Adds the restrictions and the delegate id of a token that was delegated to
   /// first@example.com and then to second@example.com.
   AssertionText& Delegate();
-  /// Makes it a holder-of-key assertion for the key of this certificate.
+  /// Changes it to a holder-of-key assertion for the key of this certificate.
   AssertionText& ConfirmByKey(const std::string& certificatePem);
 
   std::string ToXml() const;

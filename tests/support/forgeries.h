@@ -40,7 +40,7 @@ std::string OriginalAssertion();
 std::string SignatureOf(const std::string& assertion);
 /// An assertion about admin.
 std::string ForgedAssertion(ForgedId id, ForgedSignature signature, const std::string& original);
-/// A document with both, or "" if this arrangement is impossible: an unsigned forgery has no
+/// A document with both, or "" if this arrangement is impossible because an unsigned forgery has no
 /// signature to hide the original in.
 std::string Arranged(Place place, const std::string& forged, const std::string& original);
 

@@ -11,8 +11,8 @@
 
 namespace SsoClient::Testing {
 
-/// The content of an element in whose scope the prefixes saml2, ds, rsa, del, xs and xsi are bound,
-/// with a cursor over it.
+/// The content of an element in which the prefixes saml2, ds, rsa, del, xs and xsi are bound, with
+/// a cursor over it.
 class Fragment {
  public:
   explicit Fragment(const std::string& content);

@@ -11,20 +11,20 @@
 namespace SsoClient::Testing {
 namespace {
 
-// The attribute that the parser's error message names, "xmlns" or "xmlns:p"; "" for another error.
-std::string ComplaintOfNamespace(const std::string& complaint) {
-  const std::size_t begin = complaint.find(": xmlns");
-  const std::size_t end = begin == std::string::npos ? begin : complaint.find(": '", begin + 2);
-  if (end == std::string::npos || !complaint.ends_with("' is not a valid URI")) {
+// The attribute that the parser's error message names, "xmlns" or "xmlns:p"; "" for other errors.
+std::string MalformedAttributeIn(const std::string& error) {
+  const std::size_t begin = error.find(": xmlns");
+  const std::size_t end = begin == std::string::npos ? begin : error.find(": '", begin + 2);
+  if (end == std::string::npos || !error.ends_with("' is not a valid URI")) {
     return "";
   }
-  return complaint.substr(begin + 2, end - begin - 2);
+  return error.substr(begin + 2, end - begin - 2);
 }
 
 // Replaces every declaration of the prefix that the parser's error message names, except those of a
 // well-formed text. Returns false for another error and if there is nothing to replace.
-bool ReplaceMalformedNamespace(std::string& xml, const std::string& complaint) {
-  const std::string attribute = ComplaintOfNamespace(complaint);
+bool ReplaceMalformedNamespace(std::string& xml, const std::string& error) {
+  const std::string attribute = MalformedAttributeIn(error);
   if (attribute.empty()) {
     return false;
   }

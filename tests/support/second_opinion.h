@@ -9,8 +9,8 @@ namespace SsoClient::Testing {
 /// trusted credential's key; "" if it is valid.
 ///
 /// XML does not restrict namespace URIs, but the other parser refuses every text with a malformed
-/// one. Such a URI is replaced by a valid one before another attempt. If the signature or a name
-/// depends on the URI, that attempt fails as it should.
+/// one. Such a URI is replaced by a valid one before another attempt. That attempt fails, as it
+/// should, if the signature or a name depends on the URI.
 std::string SecondOpinionOf(std::string xml);
 
 }  // namespace SsoClient::Testing

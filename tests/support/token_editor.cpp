@@ -14,7 +14,7 @@
 namespace SsoClient::Testing {
 namespace {
 
-// What may or may not change a canonical form.
+// Texts whose insertion may change the canonical form.
 constexpr std::array kSnippets{" ",
                                "\t",
                                "\r\n",
@@ -128,7 +128,7 @@ std::string TokenEditor::Snippet() {
   return kSnippets[below_(kSnippets.size())];
 }
 
-// Mostly something short, sometimes a whole forged assertion or its signature.
+// Mostly a short text, sometimes a whole forged assertion or its signature.
 std::string TokenEditor::Insertion() {
   if (below_(8) != 0) {
     return Snippet();

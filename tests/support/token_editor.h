@@ -7,8 +7,8 @@
 
 namespace SsoClient::Testing {
 
-/// Makes signed assertions of every kind and edits them. A source of numbers makes the choices:
-/// random numbers, or the input of a fuzzer.
+/// Makes signed assertions of every kind and edits them. The choices depend on a source of numbers,
+/// such as random numbers or the input of a fuzzer.
 class TokenEditor {
  public:
   /// `below` returns a number less than its argument, which is at least one.

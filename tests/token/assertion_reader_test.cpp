@@ -228,7 +228,7 @@ struct Fault {
   const char* message;
 };
 
-// Every part is broken. Each message appears once the parts before it are repaired.
+// Every part is broken. Each message appears after the parts before it are fixed.
 TEST(ReadAssertionTest, ReadsItsPartsInTheirOrder) {
   const Fault faults[] = {
       {&AssertionText::attributes, R"(ID="_a1" Version="2.0" IssueInstant="soon")",

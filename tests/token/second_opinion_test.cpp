@@ -66,7 +66,7 @@ TEST(SecondOpinionTest, AcceptsWhateverTheLibraryAccepts) {
     ASSERT_EQ(*edited, *values) << xml;
     ASSERT_EQ(SecondOpinionOf(xml), "") << xml;
   }
-  // Some edits are harmless and some are fatal.
+  // Some edits are harmless, and others make the token invalid.
   EXPECT_GT(accepted, 0U);
   EXPECT_GT(refused, 0U);
 }
@@ -91,7 +91,7 @@ TEST(SecondOpinionTest, IgnoresAnUnusedMalformedNamespace) {
   EXPECT_EQ(SecondOpinionOf(xml), "");
 }
 
-// Control: such a namespace does not hide another error.
+// Control: a malformed namespace does not hide another error.
 TEST(SecondOpinionTest, RejectsATamperedAssertionWithAMalformedNamespace) {
   EXPECT_NE(SecondOpinionOf(Replaced(WithMalformedNamespace(), "alice@", "admin@")), "");
   EXPECT_NE(SecondOpinionOf(Replaced(OriginalAssertion(),

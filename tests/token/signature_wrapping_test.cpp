@@ -82,8 +82,8 @@ INSTANTIATE_TEST_SUITE_P(Arrangements, SignatureWrappingTest,
                                           testing::ValuesIn(AllForgedIds()),
                                           testing::ValuesIn(AllForgedSignatures())));
 
-// Without a resolver the forgeries that only their signature reveals are accepted. So the tests
-// above fail because of the signature.
+// Without a resolver, forgeries that only their signature reveals are accepted. So in the tests
+// above they are refused because of the signature.
 TEST(SignatureWrappingControlTest, ReadsForgeriesWhenNothingIsVerified) {
   const std::string original = OriginalAssertion();
   for (const ForgedSignature signature :

@@ -13,8 +13,8 @@
 #include "support/thrown_message.h"
 #include "support/token_values.h"
 
-// Values that are split by a node. A reader that takes the first piece of text for the whole value
-// would read another name than the signed one.
+// Values that are split by a node. A reader that uses only the first piece of text would read
+// another name than the signed one.
 namespace SsoClient::Testing {
 namespace {
 
@@ -60,7 +60,7 @@ class SplitValuesTest : public testing::TestWithParam<SplitValue> {
   }
 };
 
-// The signer does not matter: not even the trusted signer may do this.
+// Not even the trusted signer may split values.
 TEST_P(SplitValuesTest, AreRefusedEvenWhenSigned) {
   for (const char* node : {"<!---->", "<!--x-->", "<?p?>", "<?p x?>", "<x/>", "<x>y</x>"}) {
     const std::string xml = SignedXml(SplitBy(UnsignedXml(), GetParam(), node));

@@ -237,7 +237,7 @@ TEST(ReadCountAttributeTest, RefusesWhatIsNotACount) {
   }
 }
 
-// Groups digits as many locales do.
+// Groups digits like many locales.
 class Grouping : public std::numpunct<char> {
   char do_thousands_sep() const override { return ','; }
   std::string do_grouping() const override { return "\3"; }

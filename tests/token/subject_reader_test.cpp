@@ -134,7 +134,7 @@ TEST(ReadSubjectTest, RefusesUnknownMethods) {
   }
 }
 
-// Places after an expected child, the innermost first.
+// Positions after an expected child, the innermost first.
 constexpr std::pair<const char*, const char*> kEnds[] = {
     {"</ds:X509Certificate>", "Unexpected elements after X509Certificate"},
     {"</ds:X509Data>", "Unexpected elements after X509Data"},
@@ -150,8 +150,8 @@ TEST(ReadSubjectTest, RefusesAnythingAfterAnExpectedChild) {
   }
 }
 
-// There is an unexpected element after every child. Each message appears once the inner ones are
-// repaired.
+// There is an unexpected element after every child. Each message appears after the inner ones are
+// fixed.
 TEST(ReadSubjectTest, ReportsTheInnermostFaultFirst) {
   std::string text = HolderOfKeyText();
   for (const auto& [anchor, message] : kEnds) {

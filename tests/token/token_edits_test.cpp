@@ -10,8 +10,8 @@
 #include "support/thrown_message.h"
 #include "support/token_values.h"
 
-// Edits of a signed token's text: edits that its canonical form ignores change no value, and edits
-// of a value are refused as tampering.
+// Edits of a signed token's text. Edits that do not change the canonical form do not change values,
+// and edits of a value are refused as tampering.
 namespace SsoClient::Testing {
 namespace {
 
@@ -60,8 +60,8 @@ TEST(NeutralEditTest, AcceptsTextAroundTheDocumentElement) {
 }
 
 // The name in xsi:type depends on a declaration that exclusive canonical text omits if no element
-// or attribute uses its prefix. So it can be changed without breaking the signature, but that gains
-// nothing.
+// or attribute uses its prefix. So it can be changed without breaking the signature, but the type
+// is then unknown.
 TEST(PrefixEditTest, OfATypesNamespaceMakesTheTypeUnknown) {
   AssertionText text;
   text.advice.clear();

@@ -42,7 +42,7 @@ class FakePendingItem final : public Tarnik::Http::PendingRequestItem, public Ta
   bool Cancel() override { return true; }
 };
 
-/// Records what it is given. `onWait` supplies what `Wait` returns or throws.
+/// Records its arguments. `Wait` calls `onWait`, which returns or throws its result.
 class FakeUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::ObjectImpl {
  public:
   Tarnik::Ref<Tarnik::Http::PendingRequestItem> SendAsync(

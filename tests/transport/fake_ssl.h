@@ -18,7 +18,7 @@ namespace SsoClient::Testing {
 
 class FakeSslContext;
 
-/// Passes everything through to the stream below, unencrypted.
+/// Passes all data to the stream below, unencrypted.
 class FakeSslStream final : public Tarnik::Ssl::SSLStream, public Tarnik::ObjectImpl {
  public:
   FakeSslStream(Tarnik::Ref<FakeSslContext> context, Tarnik::System::Stream* below)

@@ -33,7 +33,8 @@ using testing::Not;
 
 constexpr unsigned long kTimeout = 300'000;
 constexpr unsigned long kAmpleTimeout = 30'000'000;
-// A multiple of the time limit, enough for a busy machine and far below the delay of every answer.
+// A multiple of the time limit: long enough for a busy machine, and far shorter than the delay of
+// every answer.
 constexpr std::chrono::seconds kBound{10};
 
 constexpr char kAction[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue";

@@ -92,15 +92,15 @@ TEST(SsoCustomConnectionSpecImplTest, ServesConcurrentConnects) {
 }
 
 TEST(SsoCustomConnectionSpecImplTest, ReportsAFailedConnectOnce) {
-  const LoopbackSocket deaf;  // bound but not listening: refused
+  const LoopbackSocket notListening;  // so connects are refused
   ConnectRecorder recorder;
-  MakePlainSpec("127.0.0.1", deaf.Port())->StartConnect(recorder.Completion());
+  MakePlainSpec("127.0.0.1", notListening.Port())->StartConnect(recorder.Completion());
   recorder.Wait();
   EXPECT_EQ(recorder.calls, 1);
   EXPECT_TRUE(recorder.hasError);
   EXPECT_FALSE(recorder.isOnCallersThread);
-  EXPECT_EQ(recorder.message,
-            "Cannot connect to 127.0.0.1:" + std::to_string(deaf.Port()) + ": Connection refused");
+  EXPECT_EQ(recorder.message, "Cannot connect to 127.0.0.1:" + std::to_string(notListening.Port()) +
+                                  ": Connection refused");
 }
 
 TEST(SsoCustomConnectionSpecImplTest, CancellingClosesTheSocket) {
@@ -211,14 +211,14 @@ TEST_F(SsoCustomSslConnectionSpecImplTest, AHandshakeThatCannotBeginIsReportedOn
 }
 
 TEST_F(SsoCustomSslConnectionSpecImplTest, AFailedConnectNeverStartsAHandshake) {
-  const LoopbackSocket deaf;  // bound but not listening: refused
+  const LoopbackSocket notListening;  // so connects are refused
   ConnectRecorder recorder;
-  MakeSpec("127.0.0.1", deaf.Port())->StartConnect(recorder.Completion());
+  MakeSpec("127.0.0.1", notListening.Port())->StartConnect(recorder.Completion());
   recorder.Wait();
   EXPECT_EQ(recorder.calls, 1);
   EXPECT_TRUE(recorder.hasError);
-  EXPECT_EQ(recorder.message,
-            "Cannot connect to 127.0.0.1:" + std::to_string(deaf.Port()) + ": Connection refused");
+  EXPECT_EQ(recorder.message, "Cannot connect to 127.0.0.1:" + std::to_string(notListening.Port()) +
+                                  ": Connection refused");
   EXPECT_NE(dynamic_cast<Tarnik::System::TCPClientSocket*>(recorder.lastStream.get()), nullptr);
   EXPECT_EQ(context_->wraps, 0);
 }
@@ -253,8 +253,8 @@ TEST_F(SsoCustomSslConnectionSpecImplDeathTest, AnEmptyCompletionFailsOnTheIoThr
   testing::GTEST_FLAG(death_test_style) = "threadsafe";
   EXPECT_DEATH(
       {
-        const LoopbackSocket deaf;  // bound but not listening: refused
-        MakeSpec("127.0.0.1", deaf.Port())->StartConnect(nullptr);
+        const LoopbackSocket notListening;  // so connects are refused
+        MakeSpec("127.0.0.1", notListening.Port())->StartConnect(nullptr);
         std::promise<void>().get_future().wait_for(std::chrono::seconds(20));
       },
       "bad_function_call");

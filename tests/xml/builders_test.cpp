@@ -284,7 +284,7 @@ TEST(XMLCompositeBuilderTest, FailuresOfAChildPassUnchangedAndLeaveAPartialEleme
   EXPECT_EQ(XmlText(out.get()), "<Root><First/></Root>");
 }
 
-/// Records what the output held before each build.
+/// Records the content of the output before each build.
 class WatchingBuilder final : public XMLBaseBuilder {
  public:
   void Build(Tarnik::Ref<Tarnik::Xml::ElementNode>& out) const override {

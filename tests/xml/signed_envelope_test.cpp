@@ -57,7 +57,7 @@ TEST(EnvelopeTest, DeclaresWstForBodiesThatDoNot) {
   EXPECT_EQ(response->NamespaceUri(), "http://docs.oasis-open.org/ws-sx/ws-trust/200512");
 }
 
-std::string Complaint(const std::string& xml) {
+std::string ErrorMessage(const std::string& xml) {
   const auto document = ParseXml(xml);
   return ThrownMessage<Tarnik::InvalidArgumentException>(
       [&] { RejectReservedIds(*document->RootElement()); });
@@ -65,9 +65,9 @@ std::string Complaint(const std::string& xml) {
 
 TEST(OwnIdsTest, AcceptsOtherIdsAndOneCertificate) {
   const std::string accepted = "Nothing was thrown.";
-  EXPECT_EQ(Complaint("<a Id=\"1\"><b Id=\"1\">text</b><!-- --><c/></a>"), accepted);
-  EXPECT_EQ(Complaint("<a><b><c Id=\"holderOfKeyCertificate\"/></b></a>"), accepted);
-  EXPECT_EQ(Complaint("<a Name=\"holderOfKeyProofSignature\">holderOfKeyProofSignature</a>"),
+  EXPECT_EQ(ErrorMessage("<a Id=\"1\"><b Id=\"1\">text</b><!-- --><c/></a>"), accepted);
+  EXPECT_EQ(ErrorMessage("<a><b><c Id=\"holderOfKeyCertificate\"/></b></a>"), accepted);
+  EXPECT_EQ(ErrorMessage("<a Name=\"holderOfKeyProofSignature\">holderOfKeyProofSignature</a>"),
             accepted);
 }
 
@@ -79,18 +79,19 @@ TEST(OwnIdsTest, RefusesTheSignatureIdAnywhere) {
        {"<c Id=\"holderOfKeyProofSignature\"/>", "<c ID=\"holderOfKeyProofSignature\"/>",
         "<c id=\"holderOfKeyProofSignature\"/>", "<c xml:id=\"holderOfKeyProofSignature\"/>",
         "<c xmlns:p=\"urn:p\" a=\"b\" p:Id=\"holderOfKeyProofSignature\"/>"}) {
-    EXPECT_EQ(Complaint(element), refused) << element;
-    EXPECT_EQ(Complaint("<a>text<b/><b><d/>" + std::string(element) + "</b></a>"), refused)
+    EXPECT_EQ(ErrorMessage(element), refused) << element;
+    EXPECT_EQ(ErrorMessage("<a>text<b/><b><d/>" + std::string(element) + "</b></a>"), refused)
         << element;
-    EXPECT_EQ(Complaint("<a><b><d/></b>" + std::string(element) + "</a>"), refused) << element;
+    EXPECT_EQ(ErrorMessage("<a><b><d/></b>" + std::string(element) + "</a>"), refused) << element;
   }
 }
 
 TEST(OwnIdsTest, RefusesASecondCertificateId) {
-  EXPECT_EQ(Complaint("<a><b Id=\"holderOfKeyCertificate\"/><c><d id=\"holderOfKeyCertificate\"/>"
-                      "</c></a>"),
-            "A token in the request carries the id 'holderOfKeyCertificate', which is the "
-            "request's own");
+  EXPECT_EQ(
+      ErrorMessage("<a><b Id=\"holderOfKeyCertificate\"/><c><d id=\"holderOfKeyCertificate\"/>"
+                   "</c></a>"),
+      "A token in the request carries the id 'holderOfKeyCertificate', which is the "
+      "request's own");
 }
 
 const DevSts::Credential& Credential() {

@@ -41,7 +41,7 @@ class KerberosRealm {
   /// Restarts the KDC with a clock that is wrong by `offset`, which also applies to the calls that
   /// follow: with a clock that is an hour slow, `Login` acquires tickets that have long expired.
   void SetClock(std::chrono::seconds offset);
-  /// Stops the KDC: requests are not answered from then on.
+  /// Stops the KDC. Requests are no longer answered.
   void StopKdc();
 
  private:

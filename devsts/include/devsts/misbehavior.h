@@ -9,8 +9,8 @@
 #include <utility>
 #include <vector>
 
-/// What the server can be told to do wrong. Members combine: those that choose an answer apply
-/// first, then those that change its shape, then those about timing and the connection.
+/// What the server does wrong on request. Members can be combined: those that choose an answer are
+/// applied first, then those that change its form, then those about timing and the connection.
 namespace DevSts {
 
 /// A SOAP 1.1 fault (SOAP 1.1, section 4.4).
@@ -20,7 +20,7 @@ struct FaultAnswer {
   std::string codeNamespace;
   std::string codeName;
   std::string faultString;
-  /// Writes no faultstring element at all.
+  /// Omits the faultstring element.
   bool omitFaultString = false;
   int httpStatus = 500;
 };
@@ -62,16 +62,16 @@ struct Drip {
   std::chrono::milliseconds interval{100};  ///< pause between them
 };
 
-/// What is wrong with the answer to a leg of a negotiation, unless the answer is a fault.
+/// Changes the answer to a leg of a negotiation, unless the answer is a fault.
 struct LegMisbehavior {
-  /// Answers with this Context, which may be empty. A negotiation that continues does so only in
-  /// this Context; with an empty one, it does not continue.
+  /// Answers with this Context, which may be empty. The negotiation can be continued only in this
+  /// Context; if it is empty, the negotiation cannot be continued.
   std::optional<std::string> context = {};
-  /// Writes no Context attribute.
+  /// Omits the Context attribute.
   bool omitContext = false;
   /// Answers with these octets in BinaryExchange, which may be empty.
   std::optional<std::string> leg = {};
-  /// Writes no BinaryExchange.
+  /// Omits the BinaryExchange.
   bool omitLeg = false;
   /// Sets no cookie but still requires it in the later legs.
   bool omitCookie = false;
@@ -89,8 +89,8 @@ struct Misbehavior {
   std::optional<std::string> rawAnswer;
   /// Sent before the answer (1xx answers, for example).
   std::string rawPrefix;
-  /// Changes the SOAP envelope of every answer; may run on several threads at once. If it throws,
-  /// the connection is closed without an answer.
+  /// Changes the SOAP envelope of every answer; may be called on several threads at once. If it
+  /// throws, the connection is closed without an answer.
   std::function<void(std::string& envelope)> editEnvelope;
   /// Applies to requests that are legs of a negotiation and that the service itself answers.
   LegMisbehavior leg;
@@ -102,7 +102,7 @@ struct Misbehavior {
   std::size_t padHeaderBytes = 0;
   /// Appends this many spaces to the body.
   std::size_t padBodyBytes = 0;
-  /// Sends the body in chunks of these sizes (RFC 9112, section 7.1), the last size is repeated as
+  /// Sends the body in chunks of these sizes (RFC 9112, section 7.1); the last size is repeated as
   /// needed.
   std::vector<std::size_t> chunkSizes;
   /// Closes the connection after the answer and announces it ("Connection: close").

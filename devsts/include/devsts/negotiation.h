@@ -28,19 +28,18 @@ struct NegotiationOptions {
 
 /// The course of the negotiations that begin from now on.
 struct NegotiationScript {
-  /// Signs the list of mechanisms and requires that the client signs it, too (mechListMIC: RFC
-  /// 4178, section 5), like a service that would have preferred another mechanism. A login that
-  /// Kerberos completes with one leg then takes a second one; a login that takes several legs
-  /// anyway is unchanged.
+  /// Signs the list of mechanisms and requires that the client signs it too (mechListMIC: RFC 4178,
+  /// section 5), like a service that prefers another mechanism. A login that Kerberos completes
+  /// with one leg then takes a second one; a login that already takes several legs is unchanged.
   bool requestMic = false;
   /// Asks for this many more legs after the login is complete. The content of the client's legs is
   /// ignored; the service's contain only "accept-incomplete".
   unsigned moreLegs = 0;
-  /// Answers the leg of this number, counted from 1, with `failure` and forgets the negotiation. 0:
-  /// no leg fails.
+  /// Answers the leg with this number, counted from 1, with `failure` and forgets the negotiation.
+  /// If it is 0, no leg fails.
   unsigned failAtLeg = 0;
   FaultAnswer failure{"http://docs.oasis-open.org/ws-sx/ws-trust/200512", "FailedAuthentication",
-                      "The negotiation was told to fail", false, 500};
+                      "The negotiation is configured to fail", false, 500};
 };
 
 }  // namespace DevSts

@@ -23,7 +23,7 @@ namespace DevSts {
 /// The kind of TLS server certificate.
 enum class ServerCertificate {
   Valid,                ///< for localhost, 127.0.0.1 and ::1, issued by the CA
-  ThroughIntermediate,  ///< the same, issued by an intermediate CA that is sent, too
+  ThroughIntermediate,  ///< the same, issued by an intermediate CA whose certificate is sent
   MissingIntermediate,  ///< issued by an intermediate CA that is not sent
   Expired,
   NotYetValid,
@@ -85,7 +85,7 @@ struct AssertionOptions {
   /// NotBefore of the Conditions is this long before the current time.
   std::chrono::seconds notBeforeOffset{0};
   /// Changes the assertion's text before it is signed. A ds:Signature in it is used as the
-  /// template. This hook and the next one may run on several threads at once.
+  /// template. This hook and the next one may be called on several threads at once.
   std::function<void(std::string& assertion)> beforeSigning;
   /// Changes the assertion's text in the answer after it has been signed.
   std::function<void(std::string& assertion)> afterSigning;
@@ -120,8 +120,8 @@ struct ServerOptions {
   std::size_t issuedTokenLimit = 8192;
   /// Keeps at most this many requests in the log (the oldest are removed first).
   std::size_t requestLogLimit = 4096;
-  /// Called once per request, on the connection's thread, after the answer has been determined and
-  /// before it is sent.
+  /// Called once for each request, on the connection's thread, after the answer has been determined
+  /// and before it is sent.
   std::function<void(const ReceivedRequest&)> onRequest;
 };
 
@@ -136,7 +136,7 @@ enum class RequestSignature {
 /// A received leg of a negotiation.
 struct ReceivedLeg {
   std::string context;
-  /// The number of the leg in its negotiation, from 1. 0: it belongs to no negotiation.
+  /// The number of the leg in its negotiation, counted from 1; 0 if it does not belong to one.
   unsigned ordinal = 0;
   std::string octets;
 };
@@ -157,12 +157,12 @@ struct ReceivedRequest {
   std::vector<std::pair<std::string, std::string>> headers;  ///< in order, names as sent
   std::string body;
   /// Also None if the envelope or the Security header could not be read, or if a misbehaviour
-  /// answered the request. Does not say whether the signature is valid: see the answer.
+  /// answered the request. Whether the signature is valid can be seen from the answer.
   RequestSignature signature = RequestSignature::None;
   /// The leg, if the request was one of a negotiation and could be read.
   std::optional<ReceivedLeg> leg;
   int answeredStatus = 0;     ///< 0 when raw octets were sent
-  std::string answeredFault;  ///< faultstring of the fault that was answered, else empty
+  std::string answeredFault;  ///< faultstring of the answer if it is a fault, else empty
 
   /// The first field of this name, ignoring case; empty if there is none.
   std::string Header(const std::string& name) const;
@@ -222,12 +222,12 @@ class Server {
   Credential MakeClientCredential(const std::string& commonName) const;
 
   void SetUsers(Users users);
-  /// Adds a certificate by which this user may ask for tokens. Throws `std::out_of_range` if there
-  /// is no such user, `std::runtime_error` if the certificate does not load.
+  /// Adds a certificate with which this user may request tokens. Throws `std::out_of_range` if
+  /// there is no such user, `std::runtime_error` if the certificate does not load.
   void RegisterCertificate(const std::string& userName, const std::string& certificatePem);
 
-  /// Revokes the issued token with this ID: from now on it is neither valid nor accepted. Returns
-  /// false if no such token is known.
+  /// Revokes the issued token with this ID, which is then neither valid nor accepted. Returns false
+  /// if no such token is known.
   bool Revoke(const std::string& assertionId);
 
   void SetAssertionOptions(AssertionOptions options);
@@ -246,7 +246,7 @@ class Server {
   void MisbehaveNext(Misbehavior misbehavior, std::size_t count = 1);
 
   std::vector<ReceivedRequest> Requests() const;
-  /// Throws `std::out_of_range` if there was none.
+  /// Throws `std::out_of_range` if no request was received.
   ReceivedRequest LastRequest() const;
   void ClearRequests();
   Counters GetCounters() const;

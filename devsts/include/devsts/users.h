@@ -11,13 +11,13 @@ namespace DevSts {
 struct User {
   std::string password;
   bool passwordExpired = false;
-  /// Each "DOMAIN\group".
+  /// Each in the form "DOMAIN\group".
   std::vector<std::string> groups;
   std::string givenName;
   std::string surname;
   bool isSolution = false;
-  /// Certificates, as PEM. The user may ask for tokens with each of them by proving possession of
-  /// its key.
+  /// PEM certificates. The user may request tokens with each of them by proving possession of its
+  /// key.
   std::vector<std::string> certificates = {};
 };
 

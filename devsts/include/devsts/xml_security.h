@@ -10,8 +10,8 @@
 /// All functions are pure and thread-safe; none writes to the standard streams.
 namespace DevSts {
 
-/// Thrown if an XML operation cannot be carried out: the text is not well-formed, a key does not
-/// load, libxml2 refuses the canonical form. The message says what failed.
+/// Thrown if an XML operation fails, for example because the text is not well-formed, a key cannot
+/// be loaded or libxml2 refuses the canonical form. The message says what failed.
 class XmlError : public std::runtime_error {
  public:
   using std::runtime_error::runtime_error;
@@ -90,7 +90,8 @@ struct VerifyResult {
   /// The digests of all references are correct, and so is the signature value under the
   /// certificate's key.
   bool valid = false;
-  /// Why the signature is invalid, in xmlsec1's text or our own; empty for a valid signature.
+  /// Why the signature is invalid, as reported by xmlsec1 or this library; empty for a valid
+  /// signature.
   std::string reason;
   /// The URIs of the references, unchanged, in document order; for an invalid signature, those that
   /// were read.
@@ -102,7 +103,7 @@ struct VerifyResult {
 /// Verifies the first ds:Signature in document order with the public key of `certificatePem`;
 /// KeyInfo is ignored. Ids are the attributes ID, Id, wsu:Id and AssertionID. Only same-document
 /// references are followed. The result is also invalid for a text that is not well-formed or
-/// contains no signature. Throws `XmlError` only if the certificate does not load.
+/// contains no signature. Throws `XmlError` only if the certificate cannot be loaded.
 VerifyResult VerifyXml(std::string_view xml, std::string_view certificatePem);
 
 /// The canonical form of a document, or of one element and its content.

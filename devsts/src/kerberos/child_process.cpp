@@ -39,7 +39,7 @@ std::vector<char*> PointersTo(const std::vector<std::string>& texts) {
 }
 
 std::vector<std::string> EnvironmentWith(const std::vector<std::string>& variables) {
-  // The first definition of a variable takes effect.
+  // The first definition of a variable is the one that is used.
   std::vector<std::string> result = variables;
   for (char** next = environ; *next != nullptr; ++next) {
     result.emplace_back(*next);
@@ -75,7 +75,7 @@ pid_t Start(const Command& command) {
   // Between fork and exec, only calls that are safe in the copy of a multi-threaded process.
   const pid_t process = ::fork();
   if (process == 0) {
-    // A test that crashes leaves no process running.
+    // Ends the process if the test crashes.
     ::prctl(PR_SET_PDEATHSIG, SIGKILL);
     // Signals that the caller blocks must still end the program.
     sigset_t none;

@@ -18,11 +18,12 @@ struct Command {
   std::string input;  ///< for its standard input
 };
 
-/// Runs the command and waits for its end. Throws `std::runtime_error` with its output if it fails.
+/// Runs the command and waits until it ends. Throws `std::runtime_error` with its output if it
+/// fails.
 void RunToEnd(const Command& command);
 
-/// A process in the background. The destructor ends it: with SIGTERM at first, with SIGKILL after a
-/// time-out.
+/// A process in the background. The destructor ends it with SIGTERM or, after a time-out, with
+/// SIGKILL.
 class BackgroundProcess {
  public:
   explicit BackgroundProcess(const Command& command);

@@ -67,7 +67,7 @@ class GssBuffer {
   gss_buffer_desc buffer_ = GSS_C_EMPTY_BUFFER;
 };
 
-// The octets as an argument of a call; they must outlive it. The library does not write to them.
+// The octets as an argument of a call, which they must outlive. The library does not write to them.
 inline gss_buffer_desc AsGss(const Octets& octets) {
   return {octets.size(), const_cast<unsigned char*>(octets.data())};
 }

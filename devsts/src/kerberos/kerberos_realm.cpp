@@ -101,7 +101,7 @@ class KerberosRealm::State {
         return;
       }
     }
-    throw std::runtime_error("The KDC does not start");
+    throw std::runtime_error("The KDC did not start");
   }
 
   const std::string folder;

@@ -34,7 +34,8 @@ Octets NegotiatedLogin::TakeByStage(const Octets& leg) {
 }
 
 Octets NegotiatedLogin::TakeMechanismLeg(const Octets& leg) {
-  // With an empty leg the library would send the first message itself, which is another protocol.
+  // With an empty leg, the library would start another protocol, in which it sends the first
+  // message.
   if (leg.empty()) {
     ThrowInvalidRequest("The BinaryExchange contains no leg");
   }

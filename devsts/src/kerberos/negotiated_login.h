@@ -10,7 +10,7 @@
 
 namespace DevSts {
 
-// The legs of one login, as the script prescribes. May be used on any thread, but by one thread at
+// The legs of one login according to the script. May be used on any thread, but by one thread at
 // a time.
 class NegotiatedLogin {
  public:

@@ -9,7 +9,7 @@
 
 namespace DevSts {
 
-// The users who may ask for tokens. Thread-safe.
+// The users who may request tokens. Thread-safe.
 class Accounts {
  public:
   explicit Accounts(Users users);
@@ -24,7 +24,7 @@ class Accounts {
   // The name and the account of the user who has this certificate. Throws Fault if there is none.
   std::pair<std::string, User> OwnerOf(const std::string& certificatePem) const;
   bool Has(const std::string& name) const;
-  // An account without properties if there is no user of this name.
+  // Returns an account without properties if there is no user with this name.
   User Find(const std::string& name) const;
 
  private:

@@ -48,7 +48,7 @@ void RequireMatchingUseKey(const IssueRequest& request, const KeyProof& proof) {
   }
 }
 
-// WS-Trust 1.3, section 9.2: a key is bound to a token only after its possession has been proved.
+// WS-Trust 1.3, section 9.2: a token is bound only to a key whose possession has been proved.
 void RequireProvenKey(const IssueRequest& request, const std::optional<KeyProof>& proof) {
   if (proof) {
     RequireMatchingUseKey(request, *proof);

@@ -21,7 +21,8 @@ struct PendingIssue {
   NegotiatedLogin login;
 };
 
-// The negotiations in progress, by Context. One thread at a time works on each. Thread-safe.
+// The negotiations in progress, by Context. Only one thread at a time works on each of them.
+// Thread-safe.
 class NegotiationStore {
  public:
   NegotiationStore(std::size_t limit, std::chrono::milliseconds maxAge)
@@ -39,7 +40,7 @@ class NegotiationStore {
     PendingIssue& Pending() { return *pending_; }
     // The cookie that the client must send with the later legs.
     const std::string& Cookie() const { return cookie_; }
-    // Ends the turn. The negotiation continues, from now on in this Context.
+    // Ends the turn. The negotiation continues in this Context.
     void Keep(const std::string& context);
 
    private:
@@ -57,7 +58,7 @@ class NegotiationStore {
   // Throws Fault if the Context is in use.
   Turn Begin(const std::string& context, PendingIssue pending);
   // Throws Fault if there is no such negotiation, if another thread works on it, or if the cookie
-  // belongs to another one; the negotiation is then unchanged.
+  // is wrong; the negotiation is then unchanged.
   Turn Resume(const std::string& context, const std::string& cookie);
 
   std::size_t Size() const;

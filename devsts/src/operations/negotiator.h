@@ -26,7 +26,7 @@ class Negotiator {
   // Throws GssError if the keytab has no key.
   explicit Negotiator(const NegotiationOptions& options);
 
-  // Both set the ordinal of the leg in `seen`. Both throw Fault.
+  // Both functions set the ordinal of the leg in `seen` and throw Fault.
   LegReply Begin(CheckedRequest request, IssueRequest issue, const ReceivedRequest& received,
                  const LegMisbehavior& misbehavior, ServiceParts& parts, ReceivedLeg& seen);
   LegReply Continue(const CheckedRequest& request, const ReceivedRequest& received,

@@ -35,8 +35,8 @@ struct CheckedRequest {
 // Reads an Issue request and checks everything except the requester's identity. Throws Fault.
 IssueRequest PrepareIssue(const CheckedRequest& request, const ServiceParts& parts);
 
-// Issues a token to the user who has logged in by a negotiation, of which `leg` is the last leg.
-// Throws Fault.
+// Issues a token to the user who has logged in by a negotiation with the last leg `leg`. Throws
+// Fault.
 std::string IssueTo(const std::string& userName, const IssueRequest& issue,
                     const CheckedRequest& request, ServiceParts& parts, const ServerLeg& leg);
 
@@ -47,7 +47,7 @@ std::string Renew(const CheckedRequest& request, ServiceParts& parts);
 // An ID for a new assertion.
 std::string MakeId();
 
-// Issues an assertion of this content and remembers it.
+// Issues an assertion with this content and stores it.
 std::string IssueAndRemember(TokenContent content, const CheckedRequest& request,
                              ServiceParts& parts, TokenAnswer kind, const ServerLeg& leg = {});
 

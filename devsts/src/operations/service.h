@@ -46,7 +46,7 @@ class Service {
   std::size_t OpenNegotiations() const { return negotiator_.Open(); }
 
  private:
-  // What was found in a request, even if it is refused.
+  // The properties found in a request, even if it is refused.
   struct Seen {
     RequestSignature signature = RequestSignature::None;
     std::optional<ReceivedLeg> leg;

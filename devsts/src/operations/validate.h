@@ -12,7 +12,7 @@
 
 namespace DevSts {
 
-// The state of a presented token, the worst first.
+// The state of a presented token, the most serious first.
 enum class TokenState {
   Forged,
   Unknown,
@@ -24,9 +24,9 @@ enum class TokenState {
 
 struct TokenVerdict {
   TokenState state = TokenState::Forged;
-  // What is wrong, worded to follow the token's name; empty for a valid token.
+  // The reason, a phrase that follows the token's name; empty for a valid token.
   std::string problem;
-  // What was issued under the token's ID; present for NotYetValid, Expired and Valid.
+  // The token that was issued with this ID; present for NotYetValid, Expired and Valid.
   std::optional<IssuedToken> issued;
 };
 

@@ -7,7 +7,7 @@
 
 namespace DevSts {
 
-// The identifiers in XML Signature 1.1, section 6.1, and RFC 6931, section 2.3.10.
+// The identifiers defined in XML Signature 1.1, section 6.1, and RFC 6931, section 2.3.10.
 const char* UriOf(SignatureAlgorithm algorithm);
 const char* UriOf(DigestAlgorithm algorithm);
 const char* UriOf(CanonicalMode mode);

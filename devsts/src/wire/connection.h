@@ -37,7 +37,7 @@ class Connection {
   // Ends the sending side and waits a few seconds for the peer, so that a reset does not discard
   // sent octets.
   void Finish(CutStyle style);
-  // Makes pending and later calls of the connection's thread return.
+  // Makes pending and later calls in the connection's thread return.
   void Abort();
 
   bool OverTls() const { return tls_ != nullptr; }

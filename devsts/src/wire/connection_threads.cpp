@@ -10,7 +10,7 @@
 namespace DevSts {
 namespace {
 
-// OpenSSL cannot be told to write to sockets without raising the signal.
+// OpenSSL has no option to write to sockets without raising the signal.
 void BlockBrokenPipeSignal() {
   sigset_t signals;
   sigemptyset(&signals);
@@ -20,7 +20,7 @@ void BlockBrokenPipeSignal() {
 
 using Serve = std::function<void(Connection&, std::uint64_t id)>;
 
-// A test's hook that throws ends its connection, not the process.
+// If a test's hook throws, only its connection ends, not the process.
 void ServeQuietly(Connection& connection, std::uint64_t id, const Serve& serve) {
   try {
     serve(connection, id);

@@ -9,11 +9,11 @@
 
 namespace DevSts {
 
-// The misbehaviour that is due next. Thread-safe.
+// The misbehaviour for the next connections and requests. Thread-safe.
 class MisbehaviorPlan {
  public:
   void Set(Misbehavior misbehavior);
-  // Forgets all misbehaviour that was set or is due.
+  // Forgets all misbehaviour.
   void Clear();
   void Next(Misbehavior misbehavior, std::size_t count);
 

@@ -136,8 +136,8 @@ SslContextHandle MakeTlsContext(const TlsOptions& options, const ServerIdentity&
                                 const Credential& authority) {
   SslContextHandle context(SSL_CTX_new(TLS_server_method()));
   Require(context != nullptr, "TLS context");
-  // OpenSSL must not complete the chain from a store: a certificate that is to be missing stays
-  // missing.
+  // OpenSSL must not add certificates from a store to the chain, because some chains are incomplete
+  // on purpose.
   SSL_CTX_set_mode(context.get(), SSL_MODE_NO_AUTO_CHAIN);
   SetProtocol(context.get(), options.protocol);
   SetCertificate(context.get(), identity);

@@ -84,7 +84,7 @@ DocumentHandle ParseXml(std::string_view text) {
   constexpr int kOptions = XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING;
   DocumentHandle document(xmlCtxtReadMemory(
       parser.get(), text.data(), static_cast<int>(text.size()), nullptr, nullptr, kOptions));
-  // libxml2 returns a tree even if only the namespaces are not well-formed.
+  // libxml2 also returns a tree if only the namespaces are not well-formed.
   if (!document || parser->wellFormed == 0 || parser->nsWellFormed == 0) {
     throw XmlError(LastParseError(parser.get()));
   }
