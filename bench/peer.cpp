@@ -2,11 +2,11 @@
 
 #include <stdexcept>
 
+#include <xmlsec/xmlsec.h>
 #include <libxml/parser.h>
 #include <libxml/tree.h>
 #include <xmlsec/crypto.h>
 #include <xmlsec/xmldsig.h>
-#include <xmlsec/xmlsec.h>
 #include <xmlsec/xmltree.h>
 
 namespace Bench {

@@ -3,12 +3,12 @@
 #include <mutex>
 #include <utility>
 
+#include <xmlsec/xmlsec.h>
 #include <libxml/valid.h>
 #include <libxml/xmlerror.h>
 #include <xmlsec/errors.h>
 #include <xmlsec/openssl/app.h>
 #include <xmlsec/openssl/crypto.h>
-#include <xmlsec/xmlsec.h>
 
 #include "devsts/xml_security.h"
 #include "xml/namespaces.h"
