@@ -88,8 +88,9 @@ using KeyInfoResolverSource =
 /// signature if a resolver is given. Never returns null. Thread-safe.
 ///
 /// `clockToleranceSec`, in seconds, widens the validity period at both ends; a negative value
-/// narrows it. The default is 600. A null `resolver` means that the signature is NOT verified: only
-/// its form is checked, and that it covers the token. `resolver` is used only during the call.
+/// narrows it. The default is 600. A null `resolver`, or a form without one, means that the
+/// signature is NOT verified: only its form is checked, and that it covers the token. `resolver` is
+/// used only during the call.
 ///
 /// Throws
 ///  - `Tarnik::Xml::XMLParseException` for text that is not well-formed XML, or that the parser
