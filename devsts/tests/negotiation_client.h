@@ -23,9 +23,9 @@ std::string FirstLegBody(const std::string& context, const std::string& leg,
                          const std::string& keyType = "Bearer", const std::string& more = "");
 std::string LaterLegBody(const std::string& context, const std::string& leg);
 
-// The value of the answer's Context attribute, "none" if there is none.
+// The value of the answer's Context attribute, "none" if it is absent.
 std::string ContextIn(const std::string& answer);
-// The octets of the answer's BinaryExchange, empty if there is none.
+// The octets of the answer's BinaryExchange, empty if it is absent.
 std::string LegIn(const std::string& answer);
 
 // A client's negotiation with the service. Keeps its Context and its cookie.

@@ -37,10 +37,10 @@ std::string IssueEnvelope(const std::string& user, const std::string& password,
 // The same for alice.
 std::string AliceEnvelope(const std::string& more = "");
 
-// Replaces the first occurrence. Throws if there is none.
+// Replaces the first occurrence. Throws if the text does not occur.
 std::string Replaced(std::string text, const std::string& from, const std::string& to);
 
-// The text of the answer's first element of this name, prefix included; empty if there is none.
+// The text of the answer's first element of this name, prefix included; empty if it is absent.
 std::string ElementText(const std::string& xml, const std::string& name);
 
 // The markup of the answer's assertion.

@@ -21,7 +21,7 @@ Tarnik::Ref<Tarnik::Xml::Document> ParseDocument(const std::string& text);
 /// `element` is null.
 const Tarnik::Xml::TextNode* FirstTextChild(const Tarnik::Xml::ElementNode* element);
 
-/// Returns the text of `FirstTextChild`, empty when there is none; valid as long as the document.
+/// Returns the text of `FirstTextChild`, empty when that is null; valid as long as the document.
 std::string_view ElementText(const Tarnik::Xml::ElementNode* element);
 
 /// Follows `path` down from `element`, at each step to the first child element of that local name.

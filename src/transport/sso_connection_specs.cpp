@@ -13,7 +13,7 @@ namespace {
 using ConnectCompletion = Tarnik::Http::CustomConnectionSpec::ConnectCompletion;
 using Tarnik::System::TCPClientSocket;
 
-// Where a source of replacement hosts plugs in. There is none yet.
+// Where a source of replacement hosts plugs in. No source exists yet.
 std::string FindReplacementHost() {
   return {};
 }

@@ -164,7 +164,7 @@ struct ReceivedRequest {
   int answeredStatus = 0;     ///< 0 when raw octets were sent
   std::string answeredFault;  ///< faultstring of the answer if it is a fault, else empty
 
-  /// The first field of this name, ignoring case; empty if there is none.
+  /// The first field of this name, ignoring case; empty if the field is missing.
   std::string Header(const std::string& name) const;
   std::size_t HeaderCount(const std::string& name) const;
 };

@@ -27,7 +27,7 @@ Octets MechTypesIn(const Octets& firstLeg);
 // SpnegoError.
 Octets WithMic(const Octets& response, NegState state, const Octets& mic);
 
-// The mechListMIC of a NegTokenResp, empty if there is none. Throws SpnegoError.
+// The mechListMIC of a NegTokenResp, empty if it is absent. Throws SpnegoError.
 Octets MicIn(const Octets& response);
 
 // A NegTokenResp that contains only a state.

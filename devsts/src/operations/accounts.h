@@ -21,7 +21,7 @@ class Accounts {
 
   // Throws Fault if the password is wrong or has expired.
   User Authenticate(const std::string& name, const std::string& password) const;
-  // The name and the account of the user who has this certificate. Throws Fault if there is none.
+  // The name and the account of the user who has this certificate. Throws Fault if no user has it.
   std::pair<std::string, User> OwnerOf(const std::string& certificatePem) const;
   bool Has(const std::string& name) const;
   // Returns an account without properties if there is no user with this name.

@@ -59,7 +59,7 @@ xmlNode* NextElement(const xmlNode* root, xmlNode* node);
 std::vector<xmlNode*> FindElements(xmlNode* root, std::string_view namespaceUri,
                                    std::string_view localName);
 
-// The value of the element's id attribute (ID, Id, AssertionID or wsu:Id); empty if there is none.
+// The value of the element's id attribute (ID, Id, AssertionID or wsu:Id); empty if it has no id.
 std::string IdOf(const xmlNode* element);
 
 // Registers every such attribute with the document, so that references find the elements.

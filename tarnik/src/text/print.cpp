@@ -31,7 +31,7 @@ struct Placeholder {
   std::size_t length = 0;
 };
 
-// Reads the number of an argument at the front of `text`; the number is 0 when there is none.
+// Reads the number of an argument at the start of `text`; 0 if `text` does not start with a digit.
 Placeholder ReadPlaceholder(std::string_view text, std::size_t argumentCount) {
   Placeholder result;
   while (result.length < text.size() && IsDigit(text[result.length])) {

@@ -25,7 +25,7 @@ class TARNIK_EXPORT Certificate : public virtual Object {
   virtual const std::string& SerialNumber() const = 0;
   virtual System::DateTime NotBefore() const = 0;
   virtual System::DateTime NotAfter() const = 0;
-  /// The SubjectKeyIdentifier extension; empty when there is none.
+  /// The SubjectKeyIdentifier extension; empty when it is absent.
   virtual const std::vector<unsigned char>& SubjectKeyIdentifier() const = 0;
   /// Throws `CryptoException` when the key cannot be decoded or is of an unknown kind.
   virtual Ref<const PublicKey> GetPublicKey() const = 0;
@@ -37,7 +37,7 @@ class TARNIK_EXPORT Certificate : public virtual Object {
 TARNIK_EXPORT Ref<const Certificate> CreateCertificateFromDer(const unsigned char* bytes,
                                                               std::size_t length);
 /// Reads every CERTIFICATE block of a PEM text (RFC 7468), in order. Throws `CryptoException` when
-/// there is none or one cannot be decoded.
+/// it contains no certificate or one cannot be decoded.
 TARNIK_EXPORT std::vector<Ref<const Certificate>> CreateCertificatesFromPem(std::string_view pem);
 /// Reads a file of PEM certificates. Throws `IOException` when it cannot be read, and otherwise as
 /// above.

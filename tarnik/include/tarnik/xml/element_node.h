@@ -54,7 +54,7 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
   std::string_view QualifiedNameText() const noexcept;
   std::string_view Prefix() const noexcept;
   std::string_view LocalName() const noexcept;
-  /// The namespace bound to the element's prefix here; empty when there is none.
+  /// The namespace bound to the element's prefix here; empty when the prefix is not bound.
   std::string_view NamespaceUri() const noexcept;
 
   /// The namespace that is bound to `prefix` at this element (Namespaces in XML 1.0, section 6);
@@ -83,7 +83,7 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
   /// contains what XML 1.0 does not allow (section 2.2: control characters, invalid UTF-8, U+FFFE,
   /// U+FFFF).
   void SetAttribute(std::string_view qualifiedName, std::string_view value);
-  /// Removes the attribute; false if there is none.
+  /// Removes the attribute; false if the element does not have it.
   bool RemoveAttribute(std::string_view qualifiedName) noexcept;
 
  private:
