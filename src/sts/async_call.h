@@ -2,8 +2,11 @@
 #define SSOCLIENT_STS_ASYNC_CALL_H
 
 #include <functional>
+#include <memory>
+#include <new>
 #include <utility>
 
+#include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/system/thread_pool.h>
 
@@ -23,27 +26,41 @@ class PassByRefHelper {
 
 /// Runs `operation` on a worker thread of the platform's pool and returns immediately. `callback`
 /// then receives the result and null, or an empty result and the platform exception that the
-/// operation threw, which is valid only during the call. Exceptions of other types, and those of
-/// the callback, propagate out of the work item.
+/// operation threw, which is valid only during the call. It receives a `ResourceException` when
+/// memory runs out during the operation and, on an I/O thread, when no worker can be started.
+/// Exceptions of other types, and those of the callback, propagate out of the work item.
 ///
-/// Throws `Tarnik::InvalidArgumentException` when `callback` is empty.
+/// Throws `Tarnik::InvalidArgumentException` when `callback` is empty, `CommunicationException` when
+/// the process is ending, and `Tarnik::ResourceException` when the pool has no thread at all; the
+/// callback then never runs.
 template <class Result>
 void SyncToAsyncCall(std::function<Result()> operation,
                      std::function<void(const Result&, const Tarnik::Exception*)> callback) {
   if (!callback) {
     throw Tarnik::InvalidArgumentException("The callback must not be empty.");
   }
-  Tarnik::System::GetThreadPool()->Run(
-      [operation = std::move(operation), callback = std::move(callback)] {
-        Result result{};
-        try {
-          result = operation();
-        } catch (const Tarnik::Exception& error) {
-          callback(Result{}, &error);
-          return;
-        }
-        callback(result, nullptr);
-      });
+  if (Tarnik::System::IsProcessEnding()) {
+    throw CommunicationException("The operation was not started: the process is ending.");
+  }
+  const auto report = std::make_shared<const decltype(callback)>(std::move(callback));
+  const auto pool = Tarnik::System::GetThreadPool();
+  try {
+    pool->Run([operation = std::move(operation), report] {
+      Result result{};
+      try {
+        result = operation();
+      } catch (const Tarnik::Exception& error) {
+        (*report)(Result{}, &error);
+        return;
+      } catch (const std::bad_alloc&) {
+        (*report)(Result{}, &Tarnik::OutOfMemory());
+        return;
+      }
+      (*report)(result, nullptr);
+    });
+  } catch (const Tarnik::ResourceException& error) {
+    pool->Post([report, error] { (*report)(Result{}, &error); });
+  }
 }
 
 }  // namespace SsoClient

@@ -1,5 +1,6 @@
 #include "transport/sso_connection_specs.h"
 
+#include <new>
 #include <utility>
 
 #include <tarnik/system/tcp_client_socket.h>
@@ -45,6 +46,9 @@ void StartSslHandshake(const std::string& host, Tarnik::Ssl::SSLContext* sslCont
     // For instance an invalid server name. If the exception propagated, it would end the I/O
     // thread.
     completion(sslStream != nullptr ? sslStream.get() : stream, &refusal);
+  } catch (const std::bad_alloc&) {
+    Tarnik::ResourceException failure(Tarnik::OutOfMemory());
+    completion(sslStream != nullptr ? sslStream.get() : stream, &failure);
   }
 }
 

@@ -124,4 +124,29 @@ void CancelledException::Throw() const {
   throw CancelledException(*this);
 }
 
+ResourceException::ResourceException(std::string message, const boost::source_location& where)
+    : Exception(std::move(message), where) {}
+
+ResourceException::~ResourceException() = default;
+
+std::unique_ptr<Throwable> ResourceException::Clone() const {
+  return std::make_unique<ResourceException>(*this);
+}
+
+void ResourceException::Throw() const {
+  throw ResourceException(*this);
+}
+
+// Never destroyed, since threads may report it while the process ends.
+const ResourceException& OutOfMemory() noexcept {
+  static ResourceException* const failure = new ResourceException("There is not enough memory.");
+  return *failure;
+}
+
+namespace {
+
+[[maybe_unused]] const bool kMadeAtLoad = (OutOfMemory(), true);
+
+}  // namespace
+
 }  // namespace Tarnik

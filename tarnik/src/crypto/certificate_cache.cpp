@@ -1,5 +1,10 @@
 #include "crypto/certificate_cache.h"
 
+#include <iterator>
+#include <mutex>
+
+#include "support/object_lock.h"
+
 namespace Tarnik::Crypto {
 namespace {
 
@@ -12,7 +17,7 @@ std::string_view BytesOf(const Certificate& certificate) noexcept {
 }  // namespace
 
 Ref<const Certificate> CertificateCache::Find(std::string_view der) {
-  const std::lock_guard lock(mutex_);
+  const std::lock_guard lock(ObjectLock(this));
   const auto position = positions_.find(der);
   if (position == positions_.end()) {
     return nullptr;
@@ -22,7 +27,9 @@ Ref<const Certificate> CertificateCache::Find(std::string_view der) {
 }
 
 void CertificateCache::Add(const Ref<const Certificate>& certificate) {
-  const std::lock_guard lock(mutex_);
+  // Destroyed after the lock is released.
+  Order removed;
+  const std::lock_guard lock(ObjectLock(this));
   // Two threads may have decoded the same bytes at the same time.
   if (positions_.count(BytesOf(*certificate)) != 0) {
     return;
@@ -31,12 +38,12 @@ void CertificateCache::Add(const Ref<const Certificate>& certificate) {
   positions_.emplace(BytesOf(*certificate), order_.begin());
   if (order_.size() > capacity_) {
     positions_.erase(BytesOf(*order_.back()));
-    order_.pop_back();
+    removed.splice(removed.begin(), order_, std::prev(order_.end()));
   }
 }
 
 std::size_t CertificateCache::Size() const {
-  const std::lock_guard lock(mutex_);
+  const std::lock_guard lock(ObjectLock(this));
   return order_.size();
 }
 

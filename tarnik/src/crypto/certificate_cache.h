@@ -3,7 +3,6 @@
 
 #include <cstddef>
 #include <list>
-#include <mutex>
 #include <string_view>
 #include <unordered_map>
 
@@ -28,7 +27,7 @@ class CertificateCache {
   using Order = std::list<Ref<const Certificate>>;
 
   const std::size_t capacity_;
-  mutable std::mutex mutex_;
+  // Both under `ObjectLock(this)`.
   Order order_;  // the most recently used one first
   // The keys are the bytes inside the certificates.
   std::unordered_map<std::string_view, Order::iterator> positions_;

@@ -1,5 +1,7 @@
 #include "crypto/hash.h"
 
+#include <array>
+#include <atomic>
 #include <string>
 
 #include <tarnik/crypto/crypto_exception.h>
@@ -23,22 +25,19 @@ const EVP_MD* Fetch(Hash hash) {
 
 }  // namespace
 
-// The implementations are never freed, since threads may use them while the process ends.
+// The implementations are never freed, since threads may use them while the process ends. They are
+// not the initialisers of static variables: a child that is forked while one is initialised would
+// wait for it for ever.
 const EVP_MD* FetchedHash(Hash hash) {
-  switch (hash) {
-    case Hash::kSha256: {
-      static const EVP_MD* const fetched = Fetch(Hash::kSha256);
-      return fetched;
-    }
-    case Hash::kSha384: {
-      static const EVP_MD* const fetched = Fetch(Hash::kSha384);
-      return fetched;
-    }
-    case Hash::kSha512:
-      break;
+  static constinit std::array<std::atomic<const EVP_MD*>, kHashCount> fetched{};
+  std::atomic<const EVP_MD*>& kept = fetched[static_cast<std::size_t>(hash)];
+  if (const EVP_MD* const found = kept.load(std::memory_order_acquire)) {
+    return found;
   }
-  static const EVP_MD* const fetched = Fetch(Hash::kSha512);
-  return fetched;
+  // Threads that get here together get the same object, with one reference each.
+  const EVP_MD* const added = Fetch(hash);
+  kept.store(added, std::memory_order_release);
+  return added;
 }
 
 }  // namespace Tarnik::Crypto

@@ -1,5 +1,6 @@
 #include "crypto/key_context_pool.h"
 
+#include <mutex>
 #include <string>
 #include <utility>
 
@@ -8,6 +9,7 @@
 
 #include <tarnik/crypto/crypto_exception.h>
 
+#include "support/object_lock.h"
 #include "support/openssl_error.h"
 
 namespace Tarnik::Crypto {
@@ -74,20 +76,20 @@ OpenSsl::OwnedKeyContext KeyContextPool::Take(EVP_PKEY* key, SignatureScheme sch
 
 void KeyContextPool::Keep(SignatureScheme scheme, Hash hash, OpenSsl::OwnedKeyContext context) {
   IdleContexts& idle = IdleFor(scheme, hash);
-  const std::lock_guard lock(idle.mutex);
-  if (idle.contexts.size() < kMaxIdleContexts) {
-    idle.contexts.push_back(std::move(context));
+  const std::lock_guard lock(ObjectLock(&idle));
+  if (idle.size() < kMaxIdleContexts) {
+    idle.push_back(std::move(context));
   }
 }
 
 OpenSsl::OwnedKeyContext KeyContextPool::TakeIdle(SignatureScheme scheme, Hash hash) {
   IdleContexts& idle = IdleFor(scheme, hash);
-  const std::lock_guard lock(idle.mutex);
-  if (idle.contexts.empty()) {
+  const std::lock_guard lock(ObjectLock(&idle));
+  if (idle.empty()) {
     return nullptr;
   }
-  OpenSsl::OwnedKeyContext context = std::move(idle.contexts.back());
-  idle.contexts.pop_back();
+  OpenSsl::OwnedKeyContext context = std::move(idle.back());
+  idle.pop_back();
   return context;
 }
 

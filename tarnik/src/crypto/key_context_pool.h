@@ -1,7 +1,6 @@
 #ifndef TARNIK_CRYPTO_KEY_CONTEXT_POOL_H
 #define TARNIK_CRYPTO_KEY_CONTEXT_POOL_H
 
-#include <mutex>
 #include <vector>
 
 #include "crypto/hash.h"
@@ -27,10 +26,8 @@ class KeyContextPool {
   void Keep(SignatureScheme scheme, Hash hash, OpenSsl::OwnedKeyContext context);
 
  private:
-  struct IdleContexts {
-    std::mutex mutex;
-    std::vector<OpenSsl::OwnedKeyContext> contexts;
-  };
+  /// Under `ObjectLock` of the object.
+  using IdleContexts = std::vector<OpenSsl::OwnedKeyContext>;
 
   OpenSsl::OwnedKeyContext TakeIdle(SignatureScheme scheme, Hash hash);
   IdleContexts& IdleFor(SignatureScheme scheme, Hash hash) noexcept;

@@ -3,10 +3,10 @@
 #include <utility>
 
 #include <tarnik/ssl/ssl_context.h>
-#include <tarnik/system/thread_pool.h>
 #include <tarnik/text/string_util.h>
 
 #include "core/copy_exception.h"
+#include "system/post_with.h"
 
 namespace Tarnik::Http {
 namespace {
@@ -26,25 +26,39 @@ Connection::~Connection() {
 
 void Connection::Read(ReadHandler handler) {
   std::unique_lock lock(mutex_);
-  if (early_ != nullptr) {
+  handler_ = std::move(handler);
+  if (early_) {
     lock.unlock();
-    DeliverEarly(std::move(handler));
+    // Posted, since a handler never runs inside the call that it was passed to.
+    System::PostWith(deliveryMemory_, [self = Ref<Connection>(this)] { self->DeliverEarly(); });
     return;
   }
-  handler_ = std::move(handler);
   if (std::exchange(isReading_, true)) {
     return;
   }
   lock.unlock();
-  StartRead();
+  try {
+    StartRead();
+  } catch (...) {
+    lock.lock();
+    isReading_ = false;
+    // Destroyed after the lock is released, since it may own the last reference to this object's
+    // user.
+    const ReadHandler dropped = std::exchange(handler_, nullptr);
+    lock.unlock();
+    throw;
+  }
 }
 
-// Posted, since a handler never runs inside the call that it was passed to.
-void Connection::DeliverEarly(ReadHandler handler) {
-  System::GetThreadPool()->Post([self = Ref<Connection>(this), handler = std::move(handler)] {
-    const std::unique_ptr<EarlyResult> early = std::move(self->early_);
-    handler({self->buffer_.data(), early->size}, early->error.get());
-  });
+void Connection::DeliverEarly() {
+  ReadHandler handler;
+  std::optional<EarlyResult> early;
+  {
+    const std::lock_guard guard(mutex_);
+    handler.swap(handler_);
+    early.swap(early_);
+  }
+  handler({buffer_.data(), early->size}, early->error.get());
 }
 
 void Connection::StartRead() {
@@ -62,9 +76,7 @@ void Connection::OnRead(std::size_t size, const Exception* error) {
     isReading_ = false;
     handler.swap(handler_);
     if (!handler) {
-      early_ = std::make_unique<EarlyResult>();
-      early_->size = size;
-      early_->error = error == nullptr ? nullptr : CopyException(*error);
+      early_.emplace(EarlyResult{size, error == nullptr ? nullptr : CopyException(*error)});
       return;
     }
   }

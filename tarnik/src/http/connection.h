@@ -4,6 +4,7 @@
 #include <functional>
 #include <memory>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -11,6 +12,8 @@
 #include <tarnik/core/object_impl.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/system/stream.h>
+
+#include "system/handler_memory.h"
 
 namespace Tarnik::Http {
 
@@ -29,7 +32,7 @@ class Connection final : public ObjectImpl {
   bool IsSecure() const noexcept { return isSecure_; }
 
   /// Reads the next bytes, or returns those that have arrived since `Claim`. One read at a time.
-  /// The handler runs once, on an I/O thread.
+  /// The handler runs once, on an I/O thread; never when this function throws.
   void Read(ReadHandler handler);
   /// Writes all of `data`, which must live until the completion has run.
   void Write(std::string_view data, System::Stream::WriteCompletion completion);
@@ -52,14 +55,15 @@ class Connection final : public ObjectImpl {
 
   void StartRead();
   void OnRead(std::size_t size, const Exception* error);
-  void DeliverEarly(ReadHandler handler);
+  void DeliverEarly();
 
   const Ref<System::Stream> stream_;
   const bool isSecure_;
   std::mutex mutex_;
   std::string buffer_;
   ReadHandler handler_;
-  std::unique_ptr<EarlyResult> early_;
+  std::optional<EarlyResult> early_;
+  System::HandlerMemory deliveryMemory_;
   bool isReading_ = false;
 };
 

@@ -9,6 +9,7 @@
 #include <tarnik/text/string_util.h>
 
 #include "http/set_cookie.h"
+#include "support/object_lock.h"
 #include "system/host_name.h"
 
 namespace Tarnik::Http {
@@ -82,7 +83,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
     if (!cookie) {
       return;
     }
-    const std::lock_guard guard(mutex_);
+    const std::lock_guard guard(ObjectLock(this));
     DropExpired(now);
     const auto old = std::find_if(cookies_.begin(), cookies_.end(),
                                   [&](const Cookie& each) { return IsSameCookie(each, *cookie); });
@@ -106,7 +107,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
                         const System::DateTime& now) override {
     const std::string lowerHost = StringUtil::ToLower(host);
     const std::string_view requestPath = WithoutQuery(path);
-    const std::lock_guard guard(mutex_);
+    const std::lock_guard guard(ObjectLock(this));
     DropExpired(now);
     std::vector<const Cookie*> matches;
     for (const Cookie& cookie : cookies_) {
@@ -192,7 +193,6 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
   }
 
   const std::string name_;
-  std::mutex mutex_;
   std::vector<Cookie> cookies_;  // the oldest first
 };
 

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <chrono>
+#include <exception>
 #include <new>
 #include <utility>
 
@@ -11,7 +12,9 @@
 
 #include "core/copy_exception.h"
 #include "support/ascii.h"
+#include "support/process_end.h"
 #include "system/host_name.h"
+#include "system/post_with.h"
 
 namespace Tarnik::Http {
 namespace {
@@ -36,6 +39,16 @@ TimeoutException NoAnswer(const Endpoint& endpoint, unsigned long microseconds) 
                           DurationText(microseconds) + ".");
 }
 
+// The failure that `make` returns, or `OutOfMemory()`.
+template <class Make>
+std::shared_ptr<Exception> MakeFailure(const Make& make) {
+  try {
+    return CopyException(make());
+  } catch (const std::bad_alloc&) {
+    return CopyException(OutOfMemory());
+  }
+}
+
 }  // namespace
 
 Exchange::Exchange(Parts parts)
@@ -53,17 +66,21 @@ Exchange::Exchange(Parts parts)
 Exchange::~Exchange() = default;
 
 void Exchange::Start(unsigned long timeoutMicroseconds) {
+  if (HasProcessEndBegun()) {
+    EndWithProcess();
+    return;
+  }
   if (timeoutMicroseconds != 0) {
     SetTimer(timeoutMicroseconds);
   }
-  if (const auto idle = idle_.lock()) {
-    if (const Ref<Connection> connection = idle->Take(endpoint_)) {
-      Begin(connection);
+  try {
+    const auto idle = idle_.lock();
+    const Ref<Connection> connection = idle == nullptr ? nullptr : idle->Take(endpoint_);
+    if (connection == nullptr) {
+      Connect();
       return;
     }
-  }
-  try {
-    Connect();
+    Begin(connection);
   } catch (...) {
     const auto work = Settle({});
     // If the time limit has passed already, the completion has reported that.
@@ -77,9 +94,10 @@ void Exchange::Start(unsigned long timeoutMicroseconds) {
 
 void Exchange::SetTimer(unsigned long timeoutMicroseconds) {
   const Ref<Exchange> self(this);
-  const auto timer = System::GetThreadPool()->RunAfter(
-      timeoutMicroseconds,
-      [self, timeoutMicroseconds] { self->Fail(NoAnswer(self->endpoint_, timeoutMicroseconds)); });
+  const auto timer =
+      System::GetThreadPool()->RunAfter(timeoutMicroseconds, [self, timeoutMicroseconds] {
+        self->Continue([&] { self->Fail(NoAnswer(self->endpoint_, timeoutMicroseconds)); });
+      });
   const std::lock_guard guard(mutex_);
   if (!hasEnded_) {
     work_.timer = timer;
@@ -88,8 +106,10 @@ void Exchange::SetTimer(unsigned long timeoutMicroseconds) {
 
 void Exchange::Connect() {
   const Ref<Exchange> self(this);
-  const auto connect = endpoint_.spec->StartConnect(
-      [self](System::Stream* stream, const Exception* error) { self->OnConnected(stream, error); });
+  const auto connect =
+      endpoint_.spec->StartConnect([self](System::Stream* stream, const Exception* error) {
+        self->Continue([&] { self->OnConnected(stream, error); });
+      });
   {
     const std::lock_guard guard(mutex_);
     // The completion may have run before this thread continued, and its connection may even serve
@@ -143,14 +163,14 @@ void Exchange::Begin(const Ref<Connection>& connection) {
   request->MoveTo(Route(connection->IsSecure()), wire_);
   Read(connection);
   connection->Write(wire_.Text(), [self = Ref<Exchange>(this)](const Exception* error) {
-    self->OnWritten(error);
+    self->Continue([&] { self->OnWritten(error); });
   });
 }
 
 void Exchange::Read(const Ref<Connection>& connection) {
   connection->Read(
       [self = Ref<Exchange>(this), connection](std::string_view bytes, const Exception* error) {
-        self->OnRead(connection, bytes, error);
+        self->Continue([&] { self->OnRead(connection, bytes, error); });
       });
 }
 
@@ -222,13 +242,24 @@ void Exchange::OnAnswer() {
 
 void Exchange::Finish(bool mayReuse) {
   const Ref<ClientResponseImpl> response = parser_.TakeResponse();
-  const auto work = Settle({nullptr, response});
-  if (!work) {
-    return;
+  if (const auto work = Settle({nullptr, response})) {
+    TakeOverAnswer(*response, *work, mayReuse);
+    Deliver();
   }
-  StoreCookies(*response, work->connection->IsSecure());
-  Release(*work, mayReuse);
-  Deliver();
+}
+
+// The outcome is set already, but nobody sees it before it is delivered.
+void Exchange::TakeOverAnswer(const ClientResponseImpl& response, const PendingWork& work,
+                              bool mayReuse) {
+  try {
+    StoreCookies(response, work.connection->IsSecure());
+  } catch (const std::bad_alloc&) {
+    // An answer without its cookies must not count as a success.
+    mayReuse = false;
+    const std::lock_guard guard(mutex_);
+    outcome_ = {CopyException(OutOfMemory()), nullptr};
+  }
+  Release(work, mayReuse);
 }
 
 RequestRoute Exchange::Route(bool isSecure) const {
@@ -283,27 +314,52 @@ bool Exchange::HasEnded() {
 }
 
 bool Exchange::Cancel() {
-  return FailLater(CancelledException("The request to " + endpoint_.key + " was cancelled."));
+  if (mark_.IsFromParent()) {
+    return false;
+  }
+  return FailLater(MakeFailure(
+      [&] { return CancelledException("The request to " + endpoint_.key + " was cancelled."); }));
 }
 
 Ref<ClientResponse> Exchange::Wait(unsigned long timeoutMicroseconds) {
   // Longer than any process runs, and short enough to be added to the clock's time.
   constexpr unsigned long kMaxMicroseconds = 1000000000000000;
-  const auto isDelivered = [this] { return isDelivered_; };
+  if (mark_.IsFromParent()) {
+    throw InvalidStateException("The request to " + endpoint_.key +
+                                " was begun in the parent process.");
+  }
+  const ProcessEndWatch watch(mutex_, deliveredSignal_);
+  const auto hasEnded = [this] { return isDelivered_ || HasProcessEndBegun(); };
   std::unique_lock lock(mutex_);
   if (timeoutMicroseconds != 0) {
     const std::chrono::microseconds limit(std::min(timeoutMicroseconds, kMaxMicroseconds));
-    if (!deliveredSignal_.wait_for(lock, limit, isDelivered)) {
+    if (!deliveredSignal_.wait_for(lock, limit, hasEnded)) {
       lock.unlock();
-      FailLater(NoAnswer(endpoint_, timeoutMicroseconds));
+      FailLater(MakeFailure([&] { return NoAnswer(endpoint_, timeoutMicroseconds); }));
       lock.lock();
     }
   }
-  deliveredSignal_.wait(lock, isDelivered);
+  deliveredSignal_.wait(lock, hasEnded);
+  if (!isDelivered_) {
+    lock.unlock();
+    EndWithProcess();
+    lock.lock();
+  }
   if (outcome_.failure != nullptr) {
     outcome_.failure->Throw();
   }
   return outcome_.response;
+}
+
+template <class Step>
+void Exchange::Continue(const Step& step) {
+  try {
+    step();
+  } catch (const Exception& failure) {
+    Fail(failure);
+  } catch (const std::bad_alloc&) {
+    Fail(OutOfMemory());
+  }
 }
 
 void Exchange::Fail(const Exception& failure) {
@@ -313,14 +369,25 @@ void Exchange::Fail(const Exception& failure) {
   }
 }
 
-bool Exchange::FailLater(const Exception& failure) {
-  const auto work = Settle({CopyException(failure), nullptr});
+bool Exchange::FailLater(std::shared_ptr<Exception> failure) {
+  const auto work = Settle({std::move(failure), nullptr});
   if (!work) {
     return false;
   }
   Release(*work, false);
-  System::GetThreadPool()->Post([self = Ref<Exchange>(this)] { self->Deliver(); });
+  System::PostWith(deliveryMemory_, [self = Ref<Exchange>(this)] { self->Deliver(); });
   return true;
+}
+
+void Exchange::EndWithProcess() {
+  const auto work = Settle({MakeFailure([&] {
+                              return CancelledException("The request to " + endpoint_.key +
+                                                        " was cancelled: the process is ending.");
+                            }),
+                            nullptr});
+  if (work) {
+    Release(*work, false);
+  }
 }
 
 std::optional<Exchange::PendingWork> Exchange::Settle(Outcome outcome) {
@@ -334,7 +401,7 @@ std::optional<Exchange::PendingWork> Exchange::Settle(Outcome outcome) {
   return std::exchange(work_, {});
 }
 
-void Exchange::Release(const PendingWork& work, bool mayReuse) const {
+void Exchange::Release(const PendingWork& work, bool mayReuse) const noexcept {
   if (work.timer != nullptr) {
     work.timer->Cancel();
   }
@@ -349,10 +416,14 @@ void Exchange::Release(const PendingWork& work, bool mayReuse) const {
     work.connection->Close();
     return;
   }
-  idle->Put(endpoint_, work.connection);
+  try {
+    idle->Put(endpoint_, work.connection);
+  } catch (const std::exception&) {
+    work.connection->Close();  // it cannot be kept without memory
+  }
 }
 
-void Exchange::Deliver() {
+void Exchange::Deliver() noexcept {
   UserAgent::Completion completion;
   {
     const std::lock_guard guard(mutex_);

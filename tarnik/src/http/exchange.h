@@ -15,6 +15,8 @@
 #include "http/http_request_impl.h"
 #include "http/idle_connections.h"
 #include "http/response_parser.h"
+#include "support/fork.h"
+#include "system/handler_memory.h"
 
 namespace Tarnik::Http {
 
@@ -41,7 +43,7 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   explicit Exchange(Parts parts);
 
   /// Starts the exchange; a `timeoutMicroseconds` of 0 sets no limit. Throws what the spec throws
-  /// when it cannot begin to connect; the completion then never runs.
+  /// when it cannot begin to connect, and `std::bad_alloc`; the completion then never runs.
   void Start(unsigned long timeoutMicroseconds);
   bool Cancel() override;
   /// As `UserAgent::Wait`.
@@ -78,19 +80,27 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   std::string HostField(bool isSecure) const;
   std::string CookiePath() const;
   void StoreCookies(const ClientResponseImpl& response, bool isSecure) const;
+  void TakeOverAnswer(const ClientResponseImpl& response, const PendingWork& work, bool mayReuse);
 
   bool HasEnded();
+  /// Runs a step of the exchange on an I/O thread. What the step throws is the failure of the
+  /// exchange.
+  template <class Step>
+  void Continue(const Step& step);
   /// Ends with a copy of `failure` and runs the completion. Called on an I/O thread.
   void Fail(const Exception& failure);
-  /// The same on any thread, but the completion runs later. False when the exchange had already
-  /// ended.
-  bool FailLater(const Exception& failure);
+  /// Ends with `failure` on any thread; the completion runs later. False when the exchange had
+  /// already ended.
+  bool FailLater(std::shared_ptr<Exception> failure);
+  /// Ends without the completion, since the threads that would run it have stopped.
+  void EndWithProcess();
   /// Sets the outcome and returns the operations under way; nothing when there already is an
   /// outcome.
   std::optional<PendingWork> Settle(Outcome outcome);
   /// Stops the operations under way and closes the connection, or keeps it if `mayReuse`.
-  void Release(const PendingWork& work, bool mayReuse) const;
-  void Deliver();
+  void Release(const PendingWork& work, bool mayReuse) const noexcept;
+  /// Runs the completion. An exception that leaves it ends the process.
+  void Deliver() noexcept;
 
   const Endpoint endpoint_;
   const std::string host_;
@@ -99,6 +109,7 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   const Ref<CookieStore> cookies_;
   const std::weak_ptr<IdleConnections> idle_;
   const std::string target_;
+  const ForkMark mark_;
 
   std::mutex mutex_;
   std::condition_variable deliveredSignal_;
@@ -113,6 +124,7 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   /// The answer is complete; its connection may be kept once the request has been written.
   bool isAnswerWaiting_ = false;
 
+  System::HandlerMemory deliveryMemory_;
   /// Used only by the start of the write and by its completion.
   SensitiveText wire_;
   /// Used only by the read under way and, after the last read, by `Finish`.

@@ -1,10 +1,13 @@
 #include "http/idle_connections.h"
 
 #include <algorithm>
+#include <mutex>
 #include <optional>
 #include <utility>
 
 #include <tarnik/system/thread_pool.h>
+
+#include "support/object_lock.h"
 
 namespace Tarnik::Http {
 
@@ -19,11 +22,21 @@ void IdleConnections::Discard(const Entry& entry) noexcept {
   entry.connection->Close();
 }
 
+std::vector<IdleConnections::Entry> IdleConnections::ForgetParent() {
+  if (!mark_.IsFromParent()) {
+    return {};
+  }
+  mark_ = ForkMark();
+  return std::exchange(entries_, {});
+}
+
 Ref<Connection> IdleConnections::Take(const Endpoint& endpoint) {
   while (true) {
+    std::vector<Entry> ofParent;
     std::optional<Entry> entry;
     {
-      const std::lock_guard guard(mutex_);
+      const std::lock_guard guard(ObjectLock(this));
+      ofParent = ForgetParent();
       const auto last = std::find_if(entries_.rbegin(), entries_.rend(),
                                      [&](const Entry& each) { return each.endpoint == endpoint; });
       if (last == entries_.rend()) {
@@ -52,8 +65,10 @@ void IdleConnections::Put(const Endpoint& endpoint, Ref<Connection> connection) 
   Entry entry{id, endpoint, std::move(connection),
               System::GetThreadPool()->RunAfter(kMaxIdleMicroseconds, drop)};
   std::optional<Entry> surplus;
+  std::vector<Entry> ofParent;
   {
-    const std::lock_guard guard(mutex_);
+    const std::lock_guard guard(ObjectLock(this));
+    ofParent = ForgetParent();
     if (const auto old = FindSurplus(endpoint); old != entries_.end()) {
       surplus = std::move(*old);
       entries_.erase(old);
@@ -66,7 +81,7 @@ void IdleConnections::Put(const Endpoint& endpoint, Ref<Connection> connection) 
 }
 
 std::uint64_t IdleConnections::NextId() {
-  const std::lock_guard guard(mutex_);
+  const std::lock_guard guard(ObjectLock(this));
   return ++lastId_;
 }
 
@@ -83,7 +98,7 @@ std::vector<IdleConnections::Entry>::iterator IdleConnections::FindSurplus(
 void IdleConnections::Drop(std::uint64_t id) {
   std::optional<Entry> entry;
   {
-    const std::lock_guard guard(mutex_);
+    const std::lock_guard guard(ObjectLock(this));
     const auto found = std::find_if(entries_.begin(), entries_.end(),
                                     [&](const Entry& each) { return each.id == id; });
     if (found == entries_.end()) {

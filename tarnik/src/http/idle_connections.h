@@ -3,7 +3,6 @@
 
 #include <cstdint>
 #include <memory>
-#include <mutex>
 #include <string>
 #include <vector>
 
@@ -12,6 +11,7 @@
 #include <tarnik/system/cancellable_item.h>
 
 #include "http/connection.h"
+#include "support/fork.h"
 
 namespace Tarnik::Http {
 
@@ -32,7 +32,8 @@ struct Endpoint {
   }
 };
 
-/// Connections that are currently not in use. The destructor closes them. Thread-safe.
+/// Connections that are currently not in use. The destructor closes them. A forked child begins
+/// without connections. Thread-safe.
 class IdleConnections final : public std::enable_shared_from_this<IdleConnections> {
  public:
   IdleConnections() = default;
@@ -42,7 +43,8 @@ class IdleConnections final : public std::enable_shared_from_this<IdleConnection
 
   /// The connection to `endpoint` that was used last, or null.
   Ref<Connection> Take(const Endpoint& endpoint);
-  /// Keeps a connection on which no read or write is under way.
+  /// Keeps a connection on which no read or write is under way. When it throws, the connection is
+  /// not kept.
   void Put(const Endpoint& endpoint, Ref<Connection> connection);
 
  private:
@@ -56,13 +58,17 @@ class IdleConnections final : public std::enable_shared_from_this<IdleConnection
   /// Closes the connection of a removed entry. Called without the lock.
   static void Discard(const Entry& entry) noexcept;
 
+  /// Removes the connections of a parent process. Called first by every function that takes the
+  /// lock; returns them, to be released without it.
+  std::vector<Entry> ForgetParent();
   std::uint64_t NextId();
   void Drop(std::uint64_t id);
   /// The entry to remove before one to `endpoint` is added; the end if there is room.
   std::vector<Entry>::iterator FindSurplus(const Endpoint& endpoint);
 
-  std::mutex mutex_;
+  // All under `ObjectLock(this)`.
   std::vector<Entry> entries_;  // the one that has been idle longest first
+  ForkMark mark_;
   std::uint64_t lastId_ = 0;
 };
 

@@ -2,7 +2,10 @@
 
 #include <algorithm>
 #include <iterator>
+#include <mutex>
 #include <utility>
+
+#include "support/object_lock.h"
 
 namespace Tarnik::Ssl {
 namespace {
@@ -20,7 +23,8 @@ void SessionCache::Put(const std::string& peer, OpenSsl::OwnedSslSession session
   if (SSL_SESSION_is_resumable(session.get()) == 0) {
     return;
   }
-  const std::lock_guard lock(mutex_);
+  const std::lock_guard lock(ObjectLock(this));
+  ForgetParent();
   entries_.push_front({peer, std::move(session), now});
   std::size_t ofPeer = 0;
   for (auto entry = entries_.begin(); entry != entries_.end();) {
@@ -33,7 +37,8 @@ void SessionCache::Put(const std::string& peer, OpenSsl::OwnedSslSession session
 }
 
 OpenSsl::OwnedSslSession SessionCache::Take(const std::string& peer, Clock::time_point now) {
-  const std::lock_guard lock(mutex_);
+  const std::lock_guard lock(ObjectLock(this));
+  ForgetParent();
   entries_.remove_if([now](const Entry& entry) {
     return now - entry.made >= kMaxAge || !IsPeerCertificateCurrent(entry.session.get());
   });
@@ -51,8 +56,15 @@ OpenSsl::OwnedSslSession SessionCache::Take(const std::string& peer, Clock::time
   return session;
 }
 
+void SessionCache::ForgetParent() {
+  if (mark_.IsFromParent()) {
+    mark_ = ForkMark();
+    entries_.clear();
+  }
+}
+
 std::size_t SessionCache::Size() const {
-  const std::lock_guard lock(mutex_);
+  const std::lock_guard lock(ObjectLock(this));
   return entries_.size();
 }
 

@@ -4,15 +4,16 @@
 #include <chrono>
 #include <cstddef>
 #include <list>
-#include <mutex>
 #include <string>
 
+#include "support/fork.h"
 #include "support/openssl.h"
 
 namespace Tarnik::Ssl {
 
 /// TLS sessions for resumption, stored by peer. The number of sessions is limited; the oldest is
-/// removed first. Thread-safe.
+/// removed first. A forked child begins without sessions, since a ticket that both processes use
+/// links their connections. Thread-safe.
 class SessionCache {
  public:
   using Clock = std::chrono::steady_clock;
@@ -36,8 +37,11 @@ class SessionCache {
     Clock::time_point made;
   };
 
-  mutable std::mutex mutex_;
+  void ForgetParent();
+
+  // Both under `ObjectLock(this)`.
   std::list<Entry> entries_;  // the newest first
+  ForkMark mark_;
 };
 
 }  // namespace Tarnik::Ssl

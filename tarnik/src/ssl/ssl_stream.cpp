@@ -3,17 +3,20 @@
 #include <array>
 #include <memory>
 #include <mutex>
+#include <new>
 #include <optional>
 #include <utility>
 #include <vector>
 
 #include <tarnik/core/object_impl.h>
 #include <tarnik/ssl/ssl_exception.h>
-#include <tarnik/system/thread_pool.h>
 
 #include "core/copy_exception.h"
 #include "ssl/tls_engine.h"
+#include "support/fork.h"
+#include "system/handler_memory.h"
 #include "system/host_name.h"
+#include "system/post_with.h"
 
 namespace Tarnik::Ssl {
 namespace {
@@ -23,12 +26,13 @@ constexpr std::size_t kInputSize = 16384 + 512;
 // processed, since both may produce more output.
 constexpr std::size_t kMaxOutput = 65536;
 
-using System::GetThreadPool;
-
 // Operations are recorded under the mutex, and `Advance` continues all of them as far as possible.
 // It runs only on the pool's I/O threads, after each operation that was started and each operation
 // of the stream below that ended. The mutex is not held when the stream below is used or
 // completions run.
+//
+// An allocation that fails on an I/O thread fails the connection: ending its operations needs no
+// memory.
 class SSLStreamImpl final : public SSLStream, public ObjectImpl {
  public:
   SSLStreamImpl(SSLContextImpl* context, System::Stream* stream, std::string name)
@@ -49,29 +53,39 @@ class SSLStreamImpl final : public SSLStream, public ObjectImpl {
     char* buffer;
     std::size_t size;
     ReadCompletion completion;
+    Error error;
   };
   struct PendingWrite {
     const char* data;
     std::size_t size;
     WriteCompletion completion;
+    Error error;
   };
   /// What `Advance` does after it has released the mutex.
   struct Steps {
-    std::vector<std::function<void()>> completions;
+    HandshakeCompletion endedHandshake;
+    Error handshakeError;
+    std::optional<PendingRead> endedRead;  // its size is the number of bytes that were read
+    std::optional<PendingWrite> endedWrite;
     bool read = false;
     bool write = false;
     bool close = false;
   };
 
+  void RequireOwnProcess() const;
   void AdvanceSoon();
+  void AdvanceNow();
   void Advance();
+  Steps PrepareSteps();
   void AdvanceEngine(Steps& steps);
+  void TakeOutput(Steps& steps);
+  static void Complete(const Steps& steps);
   bool AdvanceHandshake(Steps& steps);
   bool AdvanceRead(Steps& steps);
   void AdvanceWrite(Steps& steps);
-  void FailPending(const Error& error, Steps& steps);
+  void FailPending(Steps& steps);
   void RequireInput() const;
-  Error ToFailure(const Exception& error) const;
+  Error ToFailure(const Exception& error) const noexcept;
   void ReadBelow();
   void WriteBelow();
   void OnReadBelow(std::size_t bytesRead, const Exception* error);
@@ -82,9 +96,16 @@ class SSLStreamImpl final : public SSLStream, public ObjectImpl {
   const Ref<System::Stream> below_;
   const std::string name_;
 
+  const ForkMark mark_;
+  // The failure of operations after `Close`, which may not allocate.
+  const Error closedFailure_ =
+      CopyException(CancelledException("The TLS connection was closed on this side."));
+
   std::mutex mutex_;
   std::unique_ptr<TlsEngine> engine_;
-  bool closed_ = false;
+  bool isClosed_ = false;
+  bool isAdvancePosted_ = false;
+  System::HandlerMemory advanceMemory_;
   Error failure_;       // ends every operation from now on
   Error inputFailure_;  // ends operations that need more input than has arrived
   bool inputEnded_ = false;
@@ -105,6 +126,7 @@ void SSLStreamImpl::HandshakeClientAsync(const std::string& host, const std::str
   if (!completion) {
     throw InvalidArgumentException("The TLS handshake was given an empty completion.");
   }
+  RequireOwnProcess();
   System::RequireHostName(host);
   if (!serverName.empty()) {
     System::RequireHostName(serverName);
@@ -116,12 +138,17 @@ void SSLStreamImpl::HandshakeClientAsync(const std::string& host, const std::str
     }
     engine_ = std::make_unique<TlsEngine>(context_, host, serverName);
     handshake_ = std::move(completion);
-    if (closed_) {
-      failure_ =
-          std::make_shared<CancelledException>("The TLS connection was closed on this side.");
+    if (isClosed_) {
+      failure_ = closedFailure_;
     }
   }
   AdvanceSoon();
+}
+
+void SSLStreamImpl::RequireOwnProcess() const {
+  if (mark_.IsFromParent()) {
+    throw InvalidStateException("The TLS connection belongs to the parent process.");
+  }
 }
 
 void SSLStreamImpl::RequireOpen(bool busy, const char* operation) const {
@@ -137,67 +164,61 @@ void SSLStreamImpl::ReadAsync(char* buffer, std::size_t size, ReadCompletion com
   if (size == 0) {
     throw InvalidArgumentException("A read needs room for at least one byte.");
   }
+  RequireOwnProcess();
   {
     const std::lock_guard lock(mutex_);
     RequireOpen(read_.has_value(), "read");
-    read_ = PendingRead{buffer, size, std::move(completion)};
+    read_ = PendingRead{buffer, size, std::move(completion), nullptr};
   }
   AdvanceSoon();
 }
 
 void SSLStreamImpl::WriteAsync(const char* data, std::size_t size, WriteCompletion completion) {
+  RequireOwnProcess();
   {
     const std::lock_guard lock(mutex_);
     RequireOpen(write_.has_value(), "write");
-    write_ = PendingWrite{data, size, std::move(completion)};
+    write_ = PendingWrite{data, size, std::move(completion), nullptr};
   }
   AdvanceSoon();
 }
 
 void SSLStreamImpl::Close() noexcept {
+  if (mark_.IsFromParent()) {
+    return;
+  }
   {
     const std::lock_guard lock(mutex_);
-    if (closed_) {
+    if (isClosed_) {
       return;
     }
-    closed_ = true;
-    failure_ = std::make_shared<CancelledException>("The TLS connection was closed on this side.");
+    isClosed_ = true;
+    failure_ = closedFailure_;
   }
   below_->Close();
   AdvanceSoon();
 }
 
 void SSLStreamImpl::AdvanceSoon() {
-  GetThreadPool()->Post([self = Self(this)] { self->Advance(); });
+  {
+    const std::lock_guard lock(mutex_);
+    if (std::exchange(isAdvancePosted_, true)) {
+      return;
+    }
+  }
+  System::PostWith(advanceMemory_, [self = Self(this)] { self->AdvanceNow(); });
+}
+
+void SSLStreamImpl::AdvanceNow() {
+  {
+    const std::lock_guard lock(mutex_);
+    isAdvancePosted_ = false;
+  }
+  Advance();
 }
 
 void SSLStreamImpl::Advance() {
-  Steps steps;
-  {
-    const std::lock_guard lock(mutex_);
-    if (engine_ == nullptr) {
-      return;
-    }
-    try {
-      AdvanceEngine(steps);
-    } catch (const Exception& error) {
-      failure_ = CopyException(error);
-    }
-    if (failure_ != nullptr) {
-      FailPending(failure_, steps);
-      steps.read = false;
-    }
-    // Also after a failure, since the output may be an alert for the peer.
-    if (!closed_ && !writingBelow_ && engine_->OutputSize() > 0) {
-      output_ = engine_->TakeOutput();
-      steps.write = writingBelow_ = true;
-    }
-    steps.read = steps.read && !readingBelow_;
-    readingBelow_ = readingBelow_ || steps.read;
-    // A failed connection is closed, since its pending read would otherwise keep it alive until
-    // somebody closes it.
-    steps.close = failure_ != nullptr && !writingBelow_;
-  }
+  const Steps steps = PrepareSteps();
   if (steps.write) {
     WriteBelow();
   }
@@ -207,8 +228,59 @@ void SSLStreamImpl::Advance() {
   if (steps.close) {
     below_->Close();
   }
-  for (const auto& completion : steps.completions) {
-    completion();
+  Complete(steps);
+}
+
+SSLStreamImpl::Steps SSLStreamImpl::PrepareSteps() {
+  Steps steps;
+  const std::lock_guard lock(mutex_);
+  if (engine_ == nullptr) {
+    return steps;
+  }
+  try {
+    AdvanceEngine(steps);
+  } catch (const Exception& error) {
+    failure_ = CopyException(error);
+  } catch (const std::bad_alloc&) {
+    failure_ = CopyException(OutOfMemory());
+  }
+  // Also after a failure, since the output may be an alert for the peer.
+  TakeOutput(steps);
+  if (failure_ != nullptr) {
+    FailPending(steps);
+    steps.read = false;
+  }
+  steps.read = steps.read && !readingBelow_;
+  readingBelow_ = readingBelow_ || steps.read;
+  // A failed connection is closed, since its pending read would otherwise keep it alive until
+  // somebody closes it.
+  steps.close = failure_ != nullptr && !writingBelow_;
+  return steps;
+}
+
+void SSLStreamImpl::TakeOutput(Steps& steps) {
+  if (isClosed_ || writingBelow_ || engine_->OutputSize() == 0) {
+    return;
+  }
+  try {
+    engine_->TakeOutput(output_);
+    steps.write = writingBelow_ = true;
+  } catch (const std::bad_alloc&) {
+    if (failure_ == nullptr) {
+      failure_ = CopyException(OutOfMemory());
+    }
+  }
+}
+
+void SSLStreamImpl::Complete(const Steps& steps) {
+  if (steps.endedHandshake) {
+    steps.endedHandshake(steps.handshakeError.get());
+  }
+  if (steps.endedRead) {
+    steps.endedRead->completion(steps.endedRead->size, steps.endedRead->error.get());
+  }
+  if (steps.endedWrite) {
+    steps.endedWrite->completion(steps.endedWrite->error.get());
   }
 }
 
@@ -229,8 +301,7 @@ bool SSLStreamImpl::AdvanceHandshake(Steps& steps) {
   if (!engine_->Handshake()) {
     return true;
   }
-  steps.completions.push_back(
-      [completion = std::exchange(handshake_, nullptr)] { completion(nullptr); });
+  steps.endedHandshake.swap(handshake_);
   return false;
 }
 
@@ -242,10 +313,8 @@ bool SSLStreamImpl::AdvanceRead(Steps& steps) {
   if (!bytesRead) {
     return true;
   }
-  steps.completions.push_back([completion = std::move(read_->completion), size = *bytesRead] {
-    completion(size, nullptr);
-  });
-  read_.reset();
+  read_->size = *bytesRead;
+  steps.endedRead.swap(read_);
   return false;
 }
 
@@ -261,9 +330,7 @@ void SSLStreamImpl::AdvanceWrite(Steps& steps) {
   if (write_->size > 0 || writingBelow_ || engine_->OutputSize() > 0) {
     return;
   }
-  steps.completions.push_back(
-      [completion = std::move(write_->completion)] { completion(nullptr); });
-  write_.reset();
+  steps.endedWrite.swap(write_);
 }
 
 void SSLStreamImpl::RequireInput() const {
@@ -277,27 +344,30 @@ void SSLStreamImpl::RequireInput() const {
 
 // During the handshake a failure of the stream below becomes a handshake failure, which names the
 // peer.
-SSLStreamImpl::Error SSLStreamImpl::ToFailure(const Exception& error) const {
+SSLStreamImpl::Error SSLStreamImpl::ToFailure(const Exception& error) const noexcept {
   if (!handshake_ || dynamic_cast<const CancelledException*>(&error) != nullptr) {
     return CopyException(error);
   }
-  return std::make_shared<SSLException>(engine_->HandshakeError(error.Message()));
+  try {
+    return CopyException(engine_->HandshakeError(error.Message()));
+  } catch (const std::bad_alloc&) {
+    return CopyException(OutOfMemory());
+  }
 }
 
-void SSLStreamImpl::FailPending(const Error& error, Steps& steps) {
+void SSLStreamImpl::FailPending(Steps& steps) {
   if (handshake_) {
-    steps.completions.push_back(
-        [completion = std::exchange(handshake_, nullptr), error] { completion(error.get()); });
+    steps.endedHandshake.swap(handshake_);
+    steps.handshakeError = failure_;
   }
   if (read_) {
-    steps.completions.push_back(
-        [completion = std::move(read_->completion), error] { completion(0, error.get()); });
-    read_.reset();
+    read_->size = 0;
+    read_->error = failure_;
+    steps.endedRead.swap(read_);
   }
   if (write_) {
-    steps.completions.push_back(
-        [completion = std::move(write_->completion), error] { completion(error.get()); });
-    write_.reset();
+    write_->error = failure_;
+    steps.endedWrite.swap(write_);
   }
 }
 
@@ -309,6 +379,8 @@ void SSLStreamImpl::ReadBelow() {
                       });
   } catch (const Exception& error) {
     OnReadBelow(0, &error);
+  } catch (const std::bad_alloc&) {
+    OnReadBelow(0, &OutOfMemory());
   }
 }
 
@@ -325,6 +397,8 @@ void SSLStreamImpl::OnReadBelow(std::size_t bytesRead, const Exception* error) {
         engine_->Feed(input_.data(), bytesRead);
       } catch (const Exception& failed) {
         failure_ = CopyException(failed);
+      } catch (const std::bad_alloc&) {
+        failure_ = CopyException(OutOfMemory());
       }
     }
   }
@@ -337,6 +411,8 @@ void SSLStreamImpl::WriteBelow() {
                        [self = Self(this)](Exception* error) { self->OnWrittenBelow(error); });
   } catch (const Exception& error) {
     OnWrittenBelow(&error);
+  } catch (const std::bad_alloc&) {
+    OnWrittenBelow(&OutOfMemory());
   }
 }
 

@@ -9,6 +9,7 @@
 #include <tarnik/text/string_util.h>
 
 #include "support/openssl_error.h"
+#include "support/openssl_section.h"
 
 namespace Tarnik::Ssl {
 namespace {
@@ -56,11 +57,13 @@ TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
 }
 
 TlsEngine::~TlsEngine() {
+  const OpenSsl::Section section;
   if (isHandshakeDone_ && !hasFailed_) {
     // OpenSSL does not resume the session of a connection that was not shut down. This one did not
     // fail; it was only closed without close_notify.
     SSL_set_shutdown(ssl_.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
   }
+  ssl_.reset();
 }
 
 void TlsEngine::Resume() {
@@ -71,6 +74,7 @@ void TlsEngine::Resume() {
 }
 
 bool TlsEngine::Handshake() {
+  const OpenSsl::Section section;
   ERR_clear_error();
   const int result = SSL_do_handshake(ssl_.get());
   if (result == 1) {
@@ -87,6 +91,7 @@ bool TlsEngine::Handshake() {
 }
 
 std::optional<std::size_t> TlsEngine::Read(char* buffer, std::size_t size) {
+  const OpenSsl::Section section;
   ERR_clear_error();
   const int result = SSL_read(ssl_.get(), buffer, ToInt(size));
   if (result > 0) {
@@ -103,6 +108,7 @@ std::optional<std::size_t> TlsEngine::Read(char* buffer, std::size_t size) {
 }
 
 std::size_t TlsEngine::Write(const char* data, std::size_t size) {
+  const OpenSsl::Section section;
   ERR_clear_error();
   const int result = SSL_write(ssl_.get(), data, ToInt(size));
   if (result <= 0) {
@@ -121,11 +127,10 @@ std::size_t TlsEngine::OutputSize() const {
   return BIO_ctrl_pending(output_);
 }
 
-std::vector<char> TlsEngine::TakeOutput() {
-  std::vector<char> taken(OutputSize());
+void TlsEngine::TakeOutput(std::vector<char>& taken) {
+  taken.resize(OutputSize());
   const int size = taken.empty() ? 0 : BIO_read(output_, taken.data(), ToInt(taken.size()));
   taken.resize(static_cast<std::size_t>(std::max(size, 0)));
-  return taken;
 }
 
 void TlsEngine::FailAtEndOfInput() const {

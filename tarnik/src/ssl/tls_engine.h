@@ -35,8 +35,8 @@ class TlsEngine {
 
   void Feed(const char* data, std::size_t size);
   std::size_t OutputSize() const;
-  /// Moves out all pending output.
-  std::vector<char> TakeOutput();
+  /// Moves all pending output to `taken`, replacing its content.
+  void TakeOutput(std::vector<char>& taken);
 
   /// Throws the failure of the handshake or, after it, of a connection that was cut off without
   /// close_notify.

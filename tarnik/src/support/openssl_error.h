@@ -4,10 +4,12 @@
 #include <string>
 #include <string_view>
 
+#include "support/openssl_section.h"
+
 namespace Tarnik::OpenSsl {
 
-/// Restores this thread's OpenSSL error queue: errors raised within the scope are removed at its
-/// end, and errors of the host program stay.
+/// A section that restores this thread's OpenSSL error queue: errors raised within the scope are
+/// removed at its end, and errors of the host program stay.
 class ErrorScope {
  public:
   ErrorScope() noexcept;
@@ -20,6 +22,7 @@ class ErrorScope {
   std::string Describe(std::string_view what) const;
 
  private:
+  Section section_;
   unsigned long before_;
 };
 

@@ -1,11 +1,15 @@
 #include "system/pool_thread.h"
 
+#include <cstdlib>
+#include <system_error>
 #include <thread>
 #include <utility>
 
 #include <pthread.h>
 #include <signal.h>
 #include <unistd.h>
+
+#include <tarnik/core/exception.h>
 
 namespace Tarnik::System {
 namespace {
@@ -34,16 +38,31 @@ class SignalBlock {
 
 void StartPoolThread(const char* name, std::function<void()> body) {
   const SignalBlock block;
-  std::thread([name, body = std::move(body)] {
-    pthread_setname_np(pthread_self(), name);
-    body();
-  }).detach();
+  try {
+    std::thread([name, body = std::move(body)] {
+      pthread_setname_np(pthread_self(), name);
+      body();
+    }).detach();
+  } catch (const std::system_error& error) {
+    throw ResourceException("Cannot start a thread: " + error.code().message() + ".");
+  }
 }
 
 void ParkThread() noexcept {
   for (;;) {
     pause();
   }
+}
+
+CompletionScope::~CompletionScope() {
+  if (mark_.IsFromParent()) {
+    std::exit(EXIT_SUCCESS);
+  }
+}
+
+void RunCompletion(const std::function<void()>& completion) {
+  const CompletionScope scope;
+  completion();
 }
 
 }  // namespace Tarnik::System

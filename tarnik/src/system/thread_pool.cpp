@@ -1,5 +1,7 @@
 #include <algorithm>
+#include <chrono>
 #include <cstdlib>
+#include <memory>
 #include <new>
 #include <utility>
 
@@ -10,21 +12,17 @@
 #include <tarnik/core/exception.h>
 #include <tarnik/system/thread_pool.h>
 
+#include "support/fork.h"
 #include "support/openssl_init.h"
+#include "support/process_end.h"
 #include "system/pool_thread.h"
 #include "system/thread_pool_impl.h"
 
 namespace Tarnik::System {
 namespace {
 
-constexpr std::size_t kIoThreads = 2;
-constexpr std::size_t kMaxLookups = 16;
-constexpr std::chrono::seconds kIdleLimit{10};
-constexpr std::chrono::milliseconds kExitLimit{200};
 // Longer delays are cut to 30 years, which the clock can represent.
 constexpr unsigned long kMaxDelay = 30UL * 365 * 24 * 3600 * 1000000;
-
-thread_local bool isIoThread = false;
 
 class Timer final : public CancellableItem, public ObjectImpl {
  public:
@@ -33,19 +31,22 @@ class Timer final : public CancellableItem, public ObjectImpl {
 
   void Start(std::chrono::microseconds delay) {
     const std::lock_guard lock(mutex_);
-    timer_.expires_after(delay);
-    timer_.async_wait([self = Ref<Timer>(this)](const boost::system::error_code&) {
+    timer_->expires_after(delay);
+    timer_->async_wait([self = Ref<Timer>(this)](const boost::system::error_code&) {
       if (const auto completion = self->TakeCompletion()) {
-        completion();
+        RunCompletion(completion);
       }
     });
   }
 
   bool Cancel() override {
+    if (timer_.IsFromParent()) {
+      return false;
+    }
     // Destroyed after the lock is released, since destructors of its captures may call `Cancel`.
     const std::function<void()> dropped = TakeCompletion();
     const std::lock_guard lock(mutex_);
-    timer_.cancel();
+    timer_->cancel();
     return dropped != nullptr;
   }
 
@@ -58,7 +59,7 @@ class Timer final : public CancellableItem, public ObjectImpl {
   }
 
   std::mutex mutex_;
-  boost::asio::steady_timer timer_;
+  ForkBound<boost::asio::steady_timer> timer_;
   std::function<void()> completion_;
 };
 
@@ -68,34 +69,16 @@ void RequireCallable(const std::function<void()>& function) {
   }
 }
 
-// The pool is never destroyed, since its threads use it until the process ends.
-ThreadPoolImpl& ThePool() {
-  static ThreadPoolImpl* const pool = [] {
-    // Exit handlers run in reverse order: the one that is registered below runs before OpenSSL's.
-    OpenSsl::Initialise();
-    auto* created = new ThreadPoolImpl();
-    created->IncRef();
-    return created;
-  }();
-  // Registered after the pool was created, since the handler uses it.
-  static const int registered = std::atexit([] { ThePool().Freeze(); });
-  if (registered != 0) {
-    throw std::bad_alloc();
-  }
-  return *pool;
-}
+// At load, so that no thread can be inside the initialisation of the pool while another forks.
+[[maybe_unused]] const bool kTakesPartInFork = [] {
+  ProcessThreadPool();
+  SetForkHooks(ForkOrder::kThreadPool, {[]() noexcept { ProcessThreadPool().Lock(); },
+                                        []() noexcept { ProcessThreadPool().Unlock(); },
+                                        []() noexcept { ProcessThreadPool().ForgetParent(); }});
+  return true;
+}();
 
 }  // namespace
-
-ThreadPoolImpl::ThreadPoolImpl()
-    : ioContext_(std::make_unique<boost::asio::io_context>(static_cast<int>(kIoThreads))),
-      workers_("tarnik-worker", kMaxWorkers, kIdleLimit),
-      lookups_("tarnik-lookup", kMaxLookups, kIdleLimit) {
-  const std::lock_guard lock(mutex_);
-  for (; ioThreads_ < kIoThreads; ++ioThreads_) {
-    StartPoolThread("tarnik-io", [this] { IoLoop(); });
-  }
-}
 
 ThreadPoolImpl::~ThreadPoolImpl() {
   std::abort();
@@ -103,56 +86,76 @@ ThreadPoolImpl::~ThreadPoolImpl() {
 
 void ThreadPoolImpl::Run(std::function<void()> item) {
   RequireCallable(item);
-  workers_.Run(std::move(item));
+  Core().Workers().Run(std::move(item));
 }
 
 void ThreadPoolImpl::Post(std::function<void()> completion) {
   RequireCallable(completion);
-  boost::asio::post(*ioContext_, std::move(completion));
+  boost::asio::post(IoContext(),
+                    [completion = std::move(completion)] { RunCompletion(completion); });
 }
 
 Ref<CancellableItem> ThreadPoolImpl::RunAfter(unsigned long microseconds,
                                               std::function<void()> completion) {
   RequireCallable(completion);
-  const auto timer = MakeRef<Timer>(*ioContext_, std::move(completion));
+  const auto timer = MakeRef<Timer>(IoContext(), std::move(completion));
   timer->Start(std::chrono::microseconds(std::min(microseconds, kMaxDelay)));
   return timer;
 }
 
 void ThreadPoolImpl::RunLookup(std::function<void()> lookup) {
-  lookups_.Run(std::move(lookup));
+  Core().Lookups().Run(std::move(lookup));
 }
 
-void ThreadPoolImpl::Freeze() {
-  using Clock = std::chrono::steady_clock;
-  const auto end = Clock::now() + kExitLimit;
-  const auto remaining = [end] {
-    return std::max(std::chrono::duration_cast<std::chrono::milliseconds>(end - Clock::now()),
-                    std::chrono::milliseconds(0));
-  };
-  ioContext_->stop();
-  lookups_.Freeze(std::chrono::milliseconds(0));
-  WaitForIoThreads(remaining());
-  workers_.Freeze(remaining());
+PoolCore& ThreadPoolImpl::Core() {
+  PoolCore* const core = core_.load(std::memory_order_acquire);
+  return core == nullptr ? StartCore() : *core;
 }
 
-void ThreadPoolImpl::IoLoop() {
-  isIoThread = true;
-  const boost::asio::executor_work_guard<boost::asio::io_context::executor_type> untilStopped(
-      ioContext_->get_executor());
-  ioContext_->run();
-  {
-    const std::lock_guard lock(mutex_);
-    --ioThreads_;
-    ioThreadStopped_.notify_all();
+PoolCore& ThreadPoolImpl::StartCore() {
+  // Exit handlers run in reverse order: the one that is registered below runs before OpenSSL's.
+  OpenSsl::Initialise();
+  const std::lock_guard lock(mutex_);
+  if (PoolCore* const started = core_.load(std::memory_order_acquire)) {
+    return *started;
   }
-  ParkThread();
+  if (HasProcessEndBegun()) {
+    throw InvalidStateException("The thread pool cannot be started while the process is ending.");
+  }
+  auto core = std::make_unique<PoolCore>();
+  if (!isExitHandlerRegistered_) {
+    if (std::atexit([] { ProcessThreadPool().EndProcess(); }) != 0) {
+      throw std::bad_alloc();
+    }
+    isExitHandlerRegistered_ = true;
+  }
+  core->Start();
+  core_.store(core.get(), std::memory_order_release);
+  return *core.release();
 }
 
-void ThreadPoolImpl::WaitForIoThreads(std::chrono::milliseconds limit) {
-  const std::size_t ownThreads = isIoThread ? 1 : 0;
-  std::unique_lock lock(mutex_);
-  ioThreadStopped_.wait_for(lock, limit, [&] { return ioThreads_ <= ownThreads; });
+void ThreadPoolImpl::ForgetParent() noexcept {
+  if (PoolCore* const core = core_.exchange(nullptr, std::memory_order_relaxed)) {
+    coreOfParent_ = core;
+  }
+  mutex_.unlock();
+}
+
+void ThreadPoolImpl::EndProcess() noexcept {
+  BeginProcessEnd();
+  if (PoolCore* const core = core_.load(std::memory_order_acquire)) {
+    core->Freeze();
+  }
+}
+
+// Never destroyed, since threads use it until the process ends.
+ThreadPoolImpl& ProcessThreadPool() {
+  static ThreadPoolImpl* const pool = [] {
+    auto* created = new ThreadPoolImpl();
+    created->IncRef();
+    return created;
+  }();
+  return *pool;
 }
 
 ThreadPoolImpl& ToThreadPoolImpl(ThreadPool* pool) {
@@ -164,7 +167,11 @@ ThreadPoolImpl& ToThreadPoolImpl(ThreadPool* pool) {
 }
 
 Ref<ThreadPool> GetThreadPool() {
-  return Ref<ThreadPool>(&ThePool());
+  return Ref<ThreadPool>(&ProcessThreadPool());
+}
+
+bool IsProcessEnding() noexcept {
+  return HasProcessEndBegun();
 }
 
 }  // namespace Tarnik::System

@@ -1,27 +1,23 @@
 #ifndef TARNIK_SYSTEM_THREAD_POOL_IMPL_H
 #define TARNIK_SYSTEM_THREAD_POOL_IMPL_H
 
-#include <chrono>
-#include <condition_variable>
-#include <cstddef>
-#include <memory>
+#include <atomic>
+#include <functional>
 #include <mutex>
+#include <string>
 
 #include <tarnik/core/object_impl.h>
 #include <tarnik/system/thread_pool.h>
 
-#include "system/worker_set.h"
-
-namespace boost::asio {
-class io_context;
-}
+#include "system/pool_core.h"
 
 namespace Tarnik::System {
 
-/// The only implementation of `ThreadPool`.
+/// The only implementation of `ThreadPool`. Its threads are those of the process that calls it: a
+/// forked child starts new ones on first use.
 class ThreadPoolImpl final : public ThreadPool, public ObjectImpl {
  public:
-  ThreadPoolImpl();
+  ThreadPoolImpl() = default;
   ~ThreadPoolImpl() override;
 
   void Run(std::function<void()> item) override;
@@ -30,28 +26,38 @@ class ThreadPoolImpl final : public ThreadPool, public ObjectImpl {
                                 std::function<void()> completion) override;
   std::string ToString() const override { return "<ThreadPool>"; }
 
-  boost::asio::io_context& IoContext() noexcept { return *ioContext_; }
+  /// Throws `ResourceException` when the pool cannot be started.
+  boost::asio::io_context& IoContext() { return Core().IoContext(); }
 
   /// Runs `lookup`, which may block but must not wait for other work of the pool. Name lookups have
   /// separate threads, so that work items which occupy all workers and wait for connections cannot
   /// prevent these connections from being made.
   void RunLookup(std::function<void()> lookup);
 
-  /// Stops everything for process exit, as `ThreadPool` describes.
-  void Freeze();
+  /// Starts the pool if that has not been done in this process.
+  PoolCore& Core();
+
+  /// The hooks of `fork`.
+  void Lock() noexcept { mutex_.lock(); }
+  void Unlock() noexcept { mutex_.unlock(); }
+  void ForgetParent() noexcept;
+
+  /// The exit handler.
+  void EndProcess() noexcept;
 
  private:
-  void IoLoop();
-  void WaitForIoThreads(std::chrono::milliseconds limit);
-
-  const std::unique_ptr<boost::asio::io_context> ioContext_;
-  WorkerSet workers_;
-  WorkerSet lookups_;
+  PoolCore& StartCore();
 
   std::mutex mutex_;
-  std::condition_variable ioThreadStopped_;
-  std::size_t ioThreads_ = 0;
+  std::atomic<PoolCore*> core_{nullptr};
+  // The core of a parent, which is not used but must be found by leak checkers. Those of earlier
+  // ancestors are not kept: they were forgotten in the parent as well.
+  PoolCore* coreOfParent_ = nullptr;
+  bool isExitHandlerRegistered_ = false;
 };
+
+/// The implementation of what `GetThreadPool` returns.
+ThreadPoolImpl& ProcessThreadPool();
 
 /// The implementation of `pool`. Throws `InvalidArgumentException` unless `GetThreadPool` returned
 /// it.

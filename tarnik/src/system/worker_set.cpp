@@ -1,6 +1,5 @@
 #include "system/worker_set.h"
 
-#include <system_error>
 #include <utility>
 
 #include "system/pool_thread.h"
@@ -37,7 +36,7 @@ void WorkerSet::Run(std::function<void()> item) {
   }
   try {
     StartWorker();
-  } catch (const std::system_error&) {
+  } catch (...) {
     // With another worker the item runs later; without one it would never run.
     if (workers_ == 0) {
       items_.pop_back();
@@ -70,7 +69,7 @@ void WorkerSet::WorkerLoop() {
   std::function<void()> item;
   while (WaitForItem(lock, item)) {
     lock.unlock();
-    item();
+    RunCompletion(item);
     item = nullptr;
     lock.lock();
   }

@@ -98,6 +98,20 @@ class TARNIK_EXPORT CancelledException : public IOException {
   [[noreturn]] void Throw() const override;
 };
 
+/// The system has too few threads, descriptors or bytes of memory.
+class TARNIK_EXPORT ResourceException : public Exception {
+ public:
+  explicit ResourceException(std::string message,
+                             const boost::source_location& where = CurrentLocation());
+  ~ResourceException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// The failure that is reported where an allocation failed and `std::bad_alloc` cannot be thrown.
+/// It exists from the time when the library is loaded, so that reporting it needs no memory.
+TARNIK_EXPORT const ResourceException& OutOfMemory() noexcept;
+
 }  // namespace Tarnik
 
 #endif

@@ -50,8 +50,12 @@ class TARNIK_EXPORT UserAgent : public virtual Object {
   ///
   /// Throws `InvalidArgumentException` for a null request, an empty completion or a spec whose host
   /// is neither a name nor an address, `InvalidStateException` for a request that has already been
-  /// sent, and whatever the spec throws when it cannot begin to connect. The completion then never
-  /// runs.
+  /// sent, `ResourceException` when the thread pool cannot be started, `std::bad_alloc`, and
+  /// whatever the spec throws when it cannot begin to connect. The completion then never runs. It
+  /// never runs either when the process is ending (see `ThreadPool`) and in a forked child.
+  ///
+  /// When an allocation fails on an I/O thread, the exchange ends with a `ResourceException`. An
+  /// allocation that fails inside the completion is the completion's own.
   virtual Ref<PendingRequestItem> SendAsync(ClientRequest* request, Completion completion,
                                             unsigned long timeoutMicroseconds) = 0;
 
@@ -59,7 +63,9 @@ class TARNIK_EXPORT UserAgent : public virtual Object {
   /// throws its exception. When `timeoutMicroseconds` is not 0 and that time passes first, the
   /// exchange is cancelled and ends with the `TimeoutException` that is thrown. May be called
   /// several times. Must not be called on an I/O thread, including from a completion. Throws
-  /// `TypeMismatchException` for an item that was not created by an agent of this library.
+  /// `TypeMismatchException` for an item that was not created by an agent of this library,
+  /// `CancelledException` when the process is ending before the exchange has ended, and
+  /// `InvalidStateException` in a forked child for an exchange that was begun in the parent.
   virtual Ref<ClientResponse> Wait(PendingRequestItem* item, unsigned long timeoutMicroseconds) = 0;
 };
 

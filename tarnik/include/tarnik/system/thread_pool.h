@@ -18,15 +18,20 @@ namespace Tarnik::System {
 ///
 /// The process may exit while work is under way. From then on nothing is started, timers included;
 /// `exit` waits up to 200 ms for the completions and items that are running, and then continues
-/// without those that have not ended, so that a blocked item cannot block the exit. A forked child
-/// process has none of the pool's threads and must not use the pool before it calls `exec`.
+/// without those that have not ended, so that a blocked item cannot block the exit.
+///
+/// A forked child has the same pool with threads of its own, which start on first use. Items,
+/// completions and timers of the parent run only in the parent. When an item or a completion forks,
+/// the child should call `exec` or `_exit` within it: if the item returns in the child, the child
+/// ends as if by `exit(0)`, since the thread belongs to the parent.
 class TARNIK_EXPORT ThreadPool : public virtual Object {
  public:
   static constexpr int kMaxWorkers = 256;
 
   /// Runs `item` on a worker thread. An exception that leaves the item ends the process, as on any
-  /// thread. Throws `InvalidArgumentException` when `item` is empty (as do `Post` and `RunAfter`),
-  /// and `std::system_error` when there is no worker and the system cannot create a thread.
+  /// thread. Throws `InvalidArgumentException` when `item` is empty, and `ResourceException` when
+  /// the pool cannot be started or there is no worker and the system cannot create a thread; `Post`
+  /// and `RunAfter` as well, for the threads that they need.
   virtual void Run(std::function<void()> item) = 0;
   /// Runs `completion` on an I/O thread, never inside this call; it must not block.
   virtual void Post(std::function<void()> completion) = 0;
@@ -36,8 +41,12 @@ class TARNIK_EXPORT ThreadPool : public virtual Object {
                                         std::function<void()> completion) = 0;
 };
 
-/// The only pool of the process, which is started on first use.
+/// The only pool of the process, whose threads start on first use.
 TARNIK_EXPORT Ref<ThreadPool> GetThreadPool();
+
+/// True from the moment when process exit has stopped the pool: operations that need it end with a
+/// failure immediately.
+TARNIK_EXPORT bool IsProcessEnding() noexcept;
 
 }  // namespace Tarnik::System
 

@@ -1,0 +1,47 @@
+#include "support/object_lock.h"
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+
+#include "support/fork.h"
+
+namespace Tarnik {
+namespace {
+
+constexpr std::size_t kLocks = 64;
+constexpr std::size_t kCacheLineBytes = 64;
+
+struct alignas(kCacheLineBytes) PaddedMutex {
+  std::mutex mutex;
+};
+
+// A `std::mutex` has a constant initialiser and a trivial destructor, so the locks work from load
+// to exit.
+constinit std::array<PaddedMutex, kLocks> locks{};
+
+void LockAll() noexcept {
+  for (PaddedMutex& each : locks) {
+    each.mutex.lock();
+  }
+}
+
+void UnlockAll() noexcept {
+  for (PaddedMutex& each : locks) {
+    each.mutex.unlock();
+  }
+}
+
+[[maybe_unused]] const bool kTakesPartInFork =
+    (SetForkHooks(ForkOrder::kObjects, {&LockAll, &UnlockAll, &UnlockAll}), true);
+
+}  // namespace
+
+std::mutex& ObjectLock(const void* object) noexcept {
+  // Fibonacci hashing: the lowest bits of addresses are mostly equal.
+  constexpr std::uint64_t kFactor = 0x9E3779B97F4A7C15;
+  const auto hash = static_cast<std::uint64_t>(reinterpret_cast<std::uintptr_t>(object)) * kFactor;
+  return locks[hash >> 58].mutex;
+}
+
+}  // namespace Tarnik

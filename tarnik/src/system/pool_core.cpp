@@ -1,0 +1,86 @@
+#include "system/pool_core.h"
+
+#include <algorithm>
+
+#include <boost/asio/io_context.hpp>
+#include <boost/system/system_error.hpp>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/system/thread_pool.h>
+
+#include "system/pool_thread.h"
+
+namespace Tarnik::System {
+namespace {
+
+constexpr std::size_t kIoThreads = 2;
+constexpr std::size_t kMaxLookups = 16;
+constexpr std::chrono::seconds kIdleLimit{10};
+constexpr std::chrono::milliseconds kExitLimit{200};
+
+thread_local const PoolCore* ownCore = nullptr;
+
+std::unique_ptr<boost::asio::io_context> MakeIoContext() {
+  try {
+    return std::make_unique<boost::asio::io_context>(static_cast<int>(kIoThreads));
+  } catch (const boost::system::system_error& error) {
+    throw ResourceException("Cannot start the thread pool: " + error.code().message() + ".");
+  }
+}
+
+}  // namespace
+
+PoolCore::PoolCore()
+    : ioContext_(MakeIoContext()),
+      workers_("tarnik-worker", ThreadPool::kMaxWorkers, kIdleLimit),
+      lookups_("tarnik-lookup", kMaxLookups, kIdleLimit) {}
+
+PoolCore::~PoolCore() = default;
+
+void PoolCore::Start() {
+  const std::lock_guard lock(mutex_);
+  for (; ioThreads_ < kIoThreads; ++ioThreads_) {
+    try {
+      StartPoolThread("tarnik-io", [this] { IoLoop(); });
+    } catch (...) {
+      if (ioThreads_ == 0) {
+        throw;
+      }
+      return;
+    }
+  }
+}
+
+void PoolCore::Freeze() {
+  using Clock = std::chrono::steady_clock;
+  const auto end = Clock::now() + kExitLimit;
+  const auto remaining = [end] {
+    return std::max(std::chrono::duration_cast<std::chrono::milliseconds>(end - Clock::now()),
+                    std::chrono::milliseconds(0));
+  };
+  ioContext_->stop();
+  lookups_.Freeze(std::chrono::milliseconds(0));
+  WaitForIoThreads(remaining());
+  workers_.Freeze(remaining());
+}
+
+void PoolCore::IoLoop() {
+  ownCore = this;
+  const boost::asio::executor_work_guard<boost::asio::io_context::executor_type> untilStopped(
+      ioContext_->get_executor());
+  ioContext_->run();
+  {
+    const std::lock_guard lock(mutex_);
+    --ioThreads_;
+    ioThreadStopped_.notify_all();
+  }
+  ParkThread();
+}
+
+void PoolCore::WaitForIoThreads(std::chrono::milliseconds limit) {
+  const std::size_t ownThreads = ownCore == this ? 1 : 0;
+  std::unique_lock lock(mutex_);
+  ioThreadStopped_.wait_for(lock, limit, [&] { return ioThreads_ <= ownThreads; });
+}
+
+}  // namespace Tarnik::System
