@@ -30,9 +30,9 @@ class PassByRefHelper {
 /// memory runs out during the operation and, on an I/O thread, when no worker can be started.
 /// Exceptions of other types, and those of the callback, propagate out of the work item.
 ///
-/// Throws `Tarnik::InvalidArgumentException` when `callback` is empty, `CommunicationException` when
-/// the process is ending, and `Tarnik::ResourceException` when the pool has no thread at all; the
-/// callback then never runs.
+/// Throws `Tarnik::InvalidArgumentException` when `callback` is empty, `CommunicationException`
+/// when the process is ending, and `Tarnik::ResourceException` when the pool has no thread at all;
+/// the callback then never runs.
 template <class Result>
 void SyncToAsyncCall(std::function<Result()> operation,
                      std::function<void(const Result&, const Tarnik::Exception*)> callback) {

@@ -1,0 +1,44 @@
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "integration/probe_run.h"
+#include "integration/sts_fixture.h"
+
+namespace SsoClient::Testing {
+namespace {
+
+// The STS is in this process and the calls are in the probe's, so that only the libraries of the probe are forked.
+class ForkTest : public StsTest {
+ protected:
+  static int RunProbe(const std::string& scenario, int forks) {
+    const TemporaryFile ca(Sts().CaCertificatePem());
+    const TemporaryFile signing(Sts().SigningCertificatePem());
+    return RunToEnd({FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(),
+                     std::to_string(forks)},
+                    /*isLeakCheckOff=*/true);
+  }
+};
+
+TEST_F(ForkTest, ChildOfAProcessWithCallsUnderWayCanCall) {
+  EXPECT_EQ(RunProbe("call", 25), 0);
+}
+
+TEST_F(ForkTest, ChildOfAProcessWithCallsUnderWayCanExit) {
+  EXPECT_EQ(RunProbe("exit", 25), 0);
+}
+
+TEST_F(ForkTest, ChildCanExitAfterCalls) {
+  EXPECT_EQ(RunProbe("call-and-exit", 10), 0);
+}
+
+TEST_F(ForkTest, ChildOfAChildCanCall) {
+  EXPECT_EQ(RunProbe("grandchildren", 5), 0);
+}
+
+TEST_F(ForkTest, ChildThatReturnsFromACallbackEnds) {
+  EXPECT_EQ(RunProbe("callback", 5), 0);
+}
+
+}  // namespace
+}  // namespace SsoClient::Testing
