@@ -11,6 +11,7 @@
 
 #include "core/copy_exception.h"
 #include "support/ascii.h"
+#include "system/connect_stage.h"
 #include "system/host_name.h"
 
 namespace Tarnik::Http {
@@ -31,9 +32,17 @@ std::string DurationText(unsigned long microseconds) {
   return std::to_string(microseconds) + " microseconds";
 }
 
-TimeoutException NoAnswer(const Endpoint& endpoint, unsigned long microseconds) {
-  return TimeoutException("No answer from " + endpoint.key + " within " +
-                          DurationText(microseconds) + ".");
+// What an exchange without a connection is waiting for.
+const char* DescribeConnect(const System::CancellableItem* connect) noexcept {
+  const auto* progress = dynamic_cast<const System::ConnectProgress*>(connect);
+  switch (progress == nullptr ? System::ConnectStage::kConnection : progress->Stage()) {
+    case System::ConnectStage::kLookUp:
+      return "the host look-up";
+    case System::ConnectStage::kConnection:
+      return "the connection";
+    default:
+      return "the TLS handshake";
+  }
 }
 
 }  // namespace
@@ -79,7 +88,7 @@ void Exchange::SetTimer(unsigned long timeoutMicroseconds) {
   const Ref<Exchange> self(this);
   const auto timer = System::GetThreadPool()->RunAfter(
       timeoutMicroseconds,
-      [self, timeoutMicroseconds] { self->Fail(NoAnswer(self->endpoint_, timeoutMicroseconds)); });
+      [self, timeoutMicroseconds] { self->Fail(self->NoAnswer(timeoutMicroseconds)); });
   const std::lock_guard guard(mutex_);
   if (!hasEnded_) {
     work_.timer = timer;
@@ -295,7 +304,7 @@ Ref<ClientResponse> Exchange::Wait(unsigned long timeoutMicroseconds) {
     const std::chrono::microseconds limit(std::min(timeoutMicroseconds, kMaxMicroseconds));
     if (!deliveredSignal_.wait_for(lock, limit, isDelivered)) {
       lock.unlock();
-      FailLater(NoAnswer(endpoint_, timeoutMicroseconds));
+      FailLater(NoAnswer(timeoutMicroseconds));
       lock.lock();
     }
   }
@@ -321,6 +330,19 @@ bool Exchange::FailLater(const Exception& failure) {
   Release(*work, false);
   System::GetThreadPool()->Post([self = Ref<Exchange>(this)] { self->Deliver(); });
   return true;
+}
+
+TimeoutException Exchange::NoAnswer(unsigned long microseconds) {
+  return TimeoutException("No answer from " + endpoint_.key + " within " +
+                          DurationText(microseconds) + ": waiting for " + DescribeStage() + ".");
+}
+
+const char* Exchange::DescribeStage() {
+  const std::lock_guard guard(mutex_);
+  if (work_.connection == nullptr) {
+    return DescribeConnect(work_.connect.get());
+  }
+  return isWritten_ ? "the answer" : "the request to be sent";
 }
 
 std::optional<Exchange::PendingWork> Exchange::Settle(Outcome outcome) {

@@ -85,6 +85,9 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   /// The same on any thread, but the completion runs later. False when the exchange had already
   /// ended.
   bool FailLater(const Exception& failure);
+  /// The failure after the time limit; says what the exchange is waiting for.
+  TimeoutException NoAnswer(unsigned long microseconds);
+  const char* DescribeStage();
   /// Sets the outcome and returns the operations under way; nothing when there already is an
   /// outcome.
   std::optional<PendingWork> Settle(Outcome outcome);
