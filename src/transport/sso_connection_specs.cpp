@@ -96,10 +96,7 @@ Tarnik::Ref<Tarnik::System::CancellableItem> SsoCustomConnectionSpecImpl::StartC
     const std::string& host, ConnectCompletion completion) const {
   const auto socket = Tarnik::System::CreateTCPClientSocket(Tarnik::System::GetThreadPool().get());
   socket->ConnectAsync(host, port_, AsSocketCompletion(std::move(completion)));
-  return Tarnik::System::CreateCancellableItem([socket] {
-    socket->Close();
-    return true;
-  });
+  return Tarnik::System::CreateConnectItem(socket.get());
 }
 
 SsoCustomSslConnectionSpecImpl::SsoCustomSslConnectionSpecImpl(

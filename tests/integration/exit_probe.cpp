@@ -1,5 +1,5 @@
-// Ends while calls are in progress: exit_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE MICROSECONDS
-// The exit status is 0 when all calls that the scenario observes ended as they should.
+// Ends while calls are in progress: exit_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE
+// MICROSECONDS The exit status is 0 when all calls that the scenario observes ended as they should.
 #include <chrono>
 #include <cstdlib>
 #include <functional>
@@ -23,7 +23,8 @@ using SsoClient::Testing::ProbeService;
 const ProbeService* probe = nullptr;
 std::chrono::microseconds untilExit{0};
 
-/// Ends the process when a call at its end did not fail as it should; destructors cannot return a status.
+/// Ends the process when a call at its end did not fail as it should; destructors cannot return a
+/// status.
 void RequireEnding(const std::function<void()>& call) {
   try {
     call();
@@ -57,7 +58,8 @@ class JoiningGlobal {
   std::thread thread_;
 };
 
-// Constructed before the library's threads start, so it is destroyed after its exit handler has run.
+// Constructed before the library's threads start, so it is destroyed after its exit handler has
+// run.
 JoiningGlobal joiningGlobal;
 
 void StartAsyncCalls() {
@@ -109,11 +111,11 @@ void AwaitACallbackInAnExitHandler() {
       _exit(3);
     }
   });
-  probe->service->AcquireTokenAsync("alice@EXAMPLE.COM", "secret", ProbeService::Spec(),
-                                    [](const auto&, const Tarnik::Exception* failure) {
-                                      reported.set_value(failure == nullptr ? "a token"
-                                                                            : failure->Message());
-                                    });
+  probe->service->AcquireTokenAsync(
+      "alice@EXAMPLE.COM", "secret", ProbeService::Spec(),
+      [](const auto&, const Tarnik::Exception* failure) {
+        reported.set_value(failure == nullptr ? "a token" : failure->Message());
+      });
   std::this_thread::sleep_for(untilExit);
 }
 

@@ -11,7 +11,8 @@ namespace {
 
 class ExitTest : public StsTest {
  protected:
-  /// Runs the probe, which exits after some `microseconds`, and checks that it needed no time limit of a call for that.
+  /// Runs the probe, which exits after some `microseconds`, and checks that it needed no time limit
+  /// of a call for that.
   void ExpectEnds(const std::string& scenario, int microseconds) {
     const auto start = std::chrono::steady_clock::now();
     EXPECT_EQ(RunToEnd({EXIT_PROBE, scenario, Sts().HttpsUrl(), ca_.Path(), signing_.Path(),

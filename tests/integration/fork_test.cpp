@@ -8,15 +8,16 @@
 namespace SsoClient::Testing {
 namespace {
 
-// The STS is in this process and the calls are in the probe's, so that only the libraries of the probe are forked.
+// The STS is in this process and the calls are in the probe's, so that only the libraries of the
+// probe are forked.
 class ForkTest : public StsTest {
  protected:
   static int RunProbe(const std::string& scenario, int forks) {
     const TemporaryFile ca(Sts().CaCertificatePem());
     const TemporaryFile signing(Sts().SigningCertificatePem());
-    return RunToEnd({FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(),
-                     std::to_string(forks)},
-                    /*isLeakCheckOff=*/true);
+    return RunToEnd(
+        {FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(), std::to_string(forks)},
+        /*isLeakCheckOff=*/true);
   }
 };
 

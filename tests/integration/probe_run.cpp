@@ -27,9 +27,9 @@ std::vector<std::string> Environment(bool isLeakCheckOff) {
   }
   if (isLeakCheckOff) {
     const char* const options = std::getenv("ASAN_OPTIONS");
-    variables.insert(variables.begin(), "ASAN_OPTIONS=" +
-                                            std::string(options == nullptr ? "" : options) +
-                                            ":detect_leaks=0");
+    variables.insert(
+        variables.begin(),
+        "ASAN_OPTIONS=" + std::string(options == nullptr ? "" : options) + ":detect_leaks=0");
   }
   return variables;
 }

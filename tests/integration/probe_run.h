@@ -20,8 +20,9 @@ class TemporaryFile {
   std::string path_;
 };
 
-/// Runs a program. Returns its exit status, or 128 plus the number of the signal that ended it. With `isLeakCheckOff`,
-/// LeakSanitizer does not check it: it takes what the threads of a parent refer to for leaks of a forked child.
+/// Runs a program. Returns its exit status, or 128 plus the number of the signal that ended it.
+/// With `isLeakCheckOff`, LeakSanitizer does not check it: it takes what the threads of a parent
+/// refer to for leaks of a forked child.
 int RunToEnd(std::vector<std::string> command, bool isLeakCheckOff = false);
 
 }  // namespace SsoClient::Testing

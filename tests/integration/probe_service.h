@@ -8,7 +8,8 @@
 
 namespace SsoClient::Testing {
 
-/// A service as a program makes it from files: the TLS trust and the signing certificate of the STS.
+/// A service as a program makes it from files: the TLS trust and the signing certificate of the
+/// STS.
 struct ProbeService {
   ProbeService(const std::string& url, const std::string& caFile, const std::string& signingFile) {
     Tarnik::Ssl::SSLContextConfig tls;

@@ -187,8 +187,12 @@ class TimedOutExchangeTest : public StalledExchangeTest {
  protected:
   static void ExpectTimeOut(const Result& result, Clock::duration elapsed) {
     EXPECT_TRUE(IsCommunicationFailure(result)) << result.errorType << result.body;
-    EXPECT_EQ(result.message,
-              "No answer from " + Endpoint(TestedScheme()) + " within 300 milliseconds.");
+    EXPECT_THAT(result.message, testing::StartsWith("No answer from " + Endpoint(TestedScheme()) +
+                                                    " within 300 milliseconds: waiting for "));
+    if (TestedScheme() == Scheme::Https &&
+        std::get<Stage>(GetParam()).stall == Stall::BeforeTlsHandshake) {
+      EXPECT_THAT(result.message, testing::EndsWith(": waiting for the TLS handshake."));
+    }
     EXPECT_GE(elapsed, std::chrono::microseconds(kTimeout));
     EXPECT_LT(elapsed, kBound);
     EXPECT_TRUE(AreAllConnectionsClosed());
@@ -246,7 +250,8 @@ TEST_F(HttpsExchangeTest, AConnectionThatIsNeverAcceptedTimesOut) {
   const FullListener listener;
   const std::string endpoint = "127.0.0.1:" + std::to_string(listener.Port());
   const HttpsClient client("http://" + endpoint + "/", nullptr, "", kTimeout, false);
-  const std::string expected = "No answer from " + endpoint + " within 300 milliseconds.";
+  const std::string expected =
+      "No answer from " + endpoint + " within 300 milliseconds: waiting for the connection.";
 
   const Result blocking = SendAndWait(*client.CreateSession(), request_);
   EXPECT_TRUE(IsCommunicationFailure(blocking)) << blocking.errorType;

@@ -24,6 +24,11 @@ struct Cookie {
   bool isHostOnly;
 };
 
+/// With or without the full stop of the DNS root, a name means the same host.
+std::string CanonicalHost(std::string_view host) {
+  return StringUtil::ToLower(System::WithoutRootDot(host));
+}
+
 /// RFC 6265, section 5.1.3; both in lower case.
 bool DomainMatches(std::string_view host, std::string_view domain) {
   if (host == domain) {
@@ -105,7 +110,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
 
   std::string HeaderFor(std::string_view host, std::string_view path, bool isSecure,
                         const System::DateTime& now) override {
-    const std::string lowerHost = StringUtil::ToLower(host);
+    const std::string lowerHost = CanonicalHost(host);
     const std::string_view requestPath = WithoutQuery(path);
     const std::lock_guard guard(ObjectLock(this));
     DropExpired(now);
@@ -130,7 +135,7 @@ class CookieStoreImpl final : public CookieStore, public ObjectImpl {
     if (!given || (given->isSecure && !isSecure)) {
       return std::nullopt;
     }
-    const std::string lowerHost = StringUtil::ToLower(host);
+    const std::string lowerHost = CanonicalHost(host);
     const bool isHostOnly = given->domain.empty() || given->domain == lowerHost;
     if (!isHostOnly && !IsAllowedDomain(lowerHost, given->domain)) {
       return std::nullopt;

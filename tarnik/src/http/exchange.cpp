@@ -7,13 +7,11 @@
 #include <utility>
 
 #include <tarnik/http/http_exception.h>
-#include <tarnik/system/date_time.h>
 #include <tarnik/system/thread_pool.h>
 
 #include "core/copy_exception.h"
-#include "support/ascii.h"
 #include "support/process_end.h"
-#include "system/host_name.h"
+#include "system/connect_stage.h"
 #include "system/post_with.h"
 
 namespace Tarnik::Http {
@@ -34,9 +32,17 @@ std::string DurationText(unsigned long microseconds) {
   return std::to_string(microseconds) + " microseconds";
 }
 
-TimeoutException NoAnswer(const Endpoint& endpoint, unsigned long microseconds) {
-  return TimeoutException("No answer from " + endpoint.key + " within " +
-                          DurationText(microseconds) + ".");
+// What an exchange without a connection is waiting for.
+const char* DescribeConnect(const System::CancellableItem* connect) noexcept {
+  const auto* progress = dynamic_cast<const System::ConnectProgress*>(connect);
+  switch (progress == nullptr ? System::ConnectStage::kConnection : progress->Stage()) {
+    case System::ConnectStage::kLookUp:
+      return "the host look-up";
+    case System::ConnectStage::kConnection:
+      return "the connection";
+    default:
+      return "the TLS handshake";
+  }
 }
 
 // The failure that `make` returns, or `OutOfMemory()`.
@@ -53,12 +59,9 @@ std::shared_ptr<Exception> MakeFailure(const Make& make) {
 
 Exchange::Exchange(Parts parts)
     : endpoint_(std::move(parts.endpoint)),
-      host_(std::move(parts.host)),
-      cookieHost_(std::move(parts.cookieHost)),
-      isProxy_(parts.isProxy),
-      cookies_(std::move(parts.cookies)),
+      origin_({std::move(parts.host), endpoint_.key, std::move(parts.cookieHost), parts.isProxy,
+               std::move(parts.cookies), parts.request->Target()}),
       idle_(std::move(parts.idle)),
-      target_(parts.request->Target()),
       request_(std::move(parts.request)),
       completion_(std::move(parts.completion)),
       parser_(endpoint_.key) {}
@@ -96,7 +99,7 @@ void Exchange::SetTimer(unsigned long timeoutMicroseconds) {
   const Ref<Exchange> self(this);
   const auto timer =
       System::GetThreadPool()->RunAfter(timeoutMicroseconds, [self, timeoutMicroseconds] {
-        self->Continue([&] { self->Fail(NoAnswer(self->endpoint_, timeoutMicroseconds)); });
+        self->Continue([&] { self->Fail(self->NoAnswer(timeoutMicroseconds)); });
       });
   const std::lock_guard guard(mutex_);
   if (!hasEnded_) {
@@ -160,7 +163,7 @@ void Exchange::Begin(const Ref<Connection>& connection) {
     connection->Close();
     return;
   }
-  request->MoveTo(Route(connection->IsSecure()), wire_);
+  request->MoveTo(origin_.Route(connection->IsSecure()), wire_);
   Read(connection);
   connection->Write(wire_.Text(), [self = Ref<Exchange>(this)](const Exception* error) {
     self->Continue([&] { self->OnWritten(error); });
@@ -252,7 +255,7 @@ void Exchange::Finish(bool mayReuse) {
 void Exchange::TakeOverAnswer(const ClientResponseImpl& response, const PendingWork& work,
                               bool mayReuse) {
   try {
-    StoreCookies(response, work.connection->IsSecure());
+    origin_.StoreCookies(response, work.connection->IsSecure());
   } catch (const std::bad_alloc&) {
     // An answer without its cookies must not count as a success.
     mayReuse = false;
@@ -260,52 +263,6 @@ void Exchange::TakeOverAnswer(const ClientResponseImpl& response, const PendingW
     outcome_ = {CopyException(OutOfMemory()), nullptr};
   }
   Release(work, mayReuse);
-}
-
-RequestRoute Exchange::Route(bool isSecure) const {
-  RequestRoute route;
-  route.hostField = HostField(isSecure);
-  if (isProxy_) {
-    route.targetPrefix = (isSecure ? "https://" : "http://") + route.hostField;
-  }
-  if (cookies_ != nullptr) {
-    route.cookies =
-        cookies_->HeaderFor(cookieHost_, CookiePath(), isSecure, System::GetUtcDateTime());
-  }
-  return route;
-}
-
-// RFC 9110, section 7.2: the host and, unless it is the scheme's own, the port.
-std::string Exchange::HostField(bool isSecure) const {
-  std::string host = System::BracketIPv6(host_);
-  const std::string& key = endpoint_.key;
-  const auto colon = key.rfind(':');
-  const std::string port = colon == std::string::npos ? std::string() : key.substr(colon + 1);
-  if (!AreDigits(port) || port == (isSecure ? "443" : "80")) {
-    return host;
-  }
-  return host + ":" + port;
-}
-
-std::string Exchange::CookiePath() const {
-  if (target_.front() == '/') {
-    return target_;
-  }
-  const auto authority = target_.find("://");
-  const auto path = authority == std::string::npos ? authority : target_.find('/', authority + 3);
-  return path == std::string::npos ? "/" : target_.substr(path);
-}
-
-void Exchange::StoreCookies(const ClientResponseImpl& response, bool isSecure) const {
-  if (cookies_ == nullptr) {
-    return;
-  }
-  const System::DateTime now = System::GetUtcDateTime();
-  for (const auto& [name, value] : response.Headers()) {
-    if (EqualsIgnoringCase(name, "Set-Cookie")) {
-      cookies_->Store(cookieHost_, CookiePath(), isSecure, value, now);
-    }
-  }
 }
 
 bool Exchange::HasEnded() {
@@ -335,7 +292,7 @@ Ref<ClientResponse> Exchange::Wait(unsigned long timeoutMicroseconds) {
     const std::chrono::microseconds limit(std::min(timeoutMicroseconds, kMaxMicroseconds));
     if (!deliveredSignal_.wait_for(lock, limit, hasEnded)) {
       lock.unlock();
-      FailLater(MakeFailure([&] { return NoAnswer(endpoint_, timeoutMicroseconds); }));
+      FailLater(MakeFailure([&] { return NoAnswer(timeoutMicroseconds); }));
       lock.lock();
     }
   }
@@ -388,6 +345,19 @@ void Exchange::EndWithProcess() {
   if (work) {
     Release(*work, false);
   }
+}
+
+TimeoutException Exchange::NoAnswer(unsigned long microseconds) {
+  return TimeoutException("No answer from " + endpoint_.key + " within " +
+                          DurationText(microseconds) + ": waiting for " + DescribeStage() + ".");
+}
+
+const char* Exchange::DescribeStage() {
+  const std::lock_guard guard(mutex_);
+  if (work_.connection == nullptr) {
+    return DescribeConnect(work_.connect.get());
+  }
+  return isWritten_ ? "the answer" : "the request to be sent";
 }
 
 std::optional<Exchange::PendingWork> Exchange::Settle(Outcome outcome) {

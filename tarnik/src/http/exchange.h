@@ -14,6 +14,7 @@
 #include "http/connection.h"
 #include "http/http_request_impl.h"
 #include "http/idle_connections.h"
+#include "http/origin.h"
 #include "http/response_parser.h"
 #include "support/fork.h"
 #include "system/handler_memory.h"
@@ -76,10 +77,6 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   void OnAnswer();
   void Finish(bool mayReuse);
 
-  RequestRoute Route(bool isSecure) const;
-  std::string HostField(bool isSecure) const;
-  std::string CookiePath() const;
-  void StoreCookies(const ClientResponseImpl& response, bool isSecure) const;
   void TakeOverAnswer(const ClientResponseImpl& response, const PendingWork& work, bool mayReuse);
 
   bool HasEnded();
@@ -94,6 +91,9 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   bool FailLater(std::shared_ptr<Exception> failure);
   /// Ends without the completion, since the threads that would run it have stopped.
   void EndWithProcess();
+  /// The failure after the time limit; says what the exchange is waiting for.
+  TimeoutException NoAnswer(unsigned long microseconds);
+  const char* DescribeStage();
   /// Sets the outcome and returns the operations under way; nothing when there already is an
   /// outcome.
   std::optional<PendingWork> Settle(Outcome outcome);
@@ -103,12 +103,8 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   void Deliver() noexcept;
 
   const Endpoint endpoint_;
-  const std::string host_;
-  const std::string cookieHost_;
-  const bool isProxy_;
-  const Ref<CookieStore> cookies_;
+  const Origin origin_;
   const std::weak_ptr<IdleConnections> idle_;
-  const std::string target_;
   const ForkMark mark_;
 
   std::mutex mutex_;

@@ -56,17 +56,11 @@ void ExpectAddress(X509_VERIFY_PARAM* parameters, const std::string& address) {
   Require(X509_VERIFY_PARAM_set1_ip(parameters, bytes, sizeof(in6_addr)) == 1);
 }
 
-// A name may end with the full stop of the DNS root, which certificates and SNI do not have
-// (RFC 6066, section 3).
-std::string WithoutRootDot(const std::string& name) {
-  return name.back() == '.' ? name.substr(0, name.size() - 1) : name;
-}
-
 }  // namespace
 
 PeerCheck::PeerCheck(const std::string& host, const std::string& serverName,
                      const PinnedCertificates& pinned)
-    : expected_(WithoutRootDot(serverName.empty() ? host : serverName)), pinned_(pinned) {}
+    : expected_(System::WithoutRootDot(serverName.empty() ? host : serverName)), pinned_(pinned) {}
 
 void PeerCheck::ApplyTo(SSL* ssl) const {
   X509_VERIFY_PARAM* parameters = SSL_get0_param(ssl);

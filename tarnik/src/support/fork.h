@@ -2,7 +2,7 @@
 #define TARNIK_SUPPORT_FORK_H
 
 #include <cstddef>
-#include <memory>
+#include <utility>
 
 namespace Tarnik {
 
@@ -40,28 +40,30 @@ class ForkMark {
   unsigned generation_;
 };
 
-/// Owns a `T` that works with threads or descriptors of its process. A child that was forked later
-/// does not destroy it, since that would wait for the parent's threads.
+/// Contains a `T` that works with threads or descriptors of its process. A child that was forked
+/// later does not destroy it, since that would wait for the parent's threads.
 template <class T>
 class ForkBound {
  public:
   template <class... Arguments>
-  explicit ForkBound(Arguments&&... arguments)
-      : object_(std::make_unique<T>(std::forward<Arguments>(arguments)...)) {}
+  explicit ForkBound(Arguments&&... arguments) : object_(std::forward<Arguments>(arguments)...) {}
   ~ForkBound() {
-    if (mark_.IsFromParent()) {
-      static_cast<void>(object_.release());
+    if (!mark_.IsFromParent()) {
+      object_.~T();
     }
   }
   ForkBound(const ForkBound&) = delete;
   ForkBound& operator=(const ForkBound&) = delete;
 
   bool IsFromParent() const noexcept { return mark_.IsFromParent(); }
-  T* operator->() const noexcept { return object_.get(); }
-  T& operator*() const noexcept { return *object_; }
+  T* operator->() noexcept { return &object_; }
+  T& operator*() noexcept { return object_; }
 
  private:
-  std::unique_ptr<T> object_;
+  // A member of a union is destroyed only explicitly.
+  union {
+    T object_;
+  };
   ForkMark mark_;
 };
 

@@ -7,6 +7,8 @@
 #include <type_traits>
 #include <utility>
 
+#include "system/pool_thread.h"
+
 namespace Tarnik::System {
 
 /// Memory for one handler of Asio at a time, as a member of the object that starts the operation:
@@ -77,7 +79,8 @@ class HandlerAllocator {
   HandlerMemory* memory_;
 };
 
-/// A handler whose associated allocator is over a `HandlerMemory`.
+/// A handler that runs in a `CompletionScope`, and whose associated allocator is over a
+/// `HandlerMemory`.
 template <class Handler>
 class HandlerWithMemory {
  public:
@@ -93,6 +96,7 @@ class HandlerWithMemory {
 
   template <class... Arguments>
   void operator()(Arguments&&... arguments) {
+    const CompletionScope scope;
     handler_(std::forward<Arguments>(arguments)...);
   }
 

@@ -56,7 +56,7 @@ void RequireHostName(std::string_view host) {
   if (host.empty()) {
     throw InvalidArgumentException("The host name is empty.");
   }
-  if (host.size() > kMaxNameLength) {
+  if (WithoutRootDot(host).size() > kMaxNameLength) {
     throw InvalidArgumentException("The host name is longer than 253 characters.");
   }
   if (host.front() == '.') {
@@ -79,7 +79,12 @@ bool IsAddressLiteral(std::string_view host) noexcept {
   return IsIPv4Address(host) || IsIPv6Address(host.substr(0, host.find('%')));
 }
 
+std::string_view WithoutRootDot(std::string_view host) noexcept {
+  return host.size() > 1 && host.back() == '.' ? host.substr(0, host.size() - 1) : host;
+}
+
 bool IsDnsName(std::string_view host) noexcept {
+  host = WithoutRootDot(host);
   if (host.empty() || host.size() > kMaxNameLength) {
     return false;
   }

@@ -7,7 +7,6 @@
 #include <boost/asio/post.hpp>
 
 #include "system/handler_memory.h"
-#include "system/pool_thread.h"
 #include "system/thread_pool_impl.h"
 
 namespace Tarnik::System {
@@ -16,11 +15,7 @@ namespace Tarnik::System {
 /// in this process, this cannot fail unless the memory is in use.
 template <class Completion>
 void PostWith(HandlerMemory& memory, Completion completion) {
-  boost::asio::post(ProcessThreadPool().IoContext(),
-                    WithMemory(memory, [completion = std::move(completion)] {
-                      const CompletionScope scope;
-                      completion();
-                    }));
+  boost::asio::post(ProcessThreadPool().IoContext(), WithMemory(memory, std::move(completion)));
 }
 
 }  // namespace Tarnik::System

@@ -1,92 +1,146 @@
-#include <cstring>
+#include <atomic>
+#include <exception>
 #include <mutex>
 #include <utility>
-#include <vector>
 
 #include <boost/asio/buffer.hpp>
-#include <boost/asio/ip/tcp.hpp>
+#include <boost/asio/post.hpp>
 
 #include <tarnik/core/object_impl.h>
 #include <tarnik/system/tcp_client_socket.h>
 
-#include "system/host_lookup.h"
+#include "support/fork.h"
+#include "system/connect_race.h"
+#include "system/connect_stage.h"
+#include "system/handler_memory.h"
 #include "system/host_name.h"
+#include "system/tcp_client_socket_impl.h"
+#include "system/tcp_socket.h"
 #include "system/thread_pool_impl.h"
 
 namespace Tarnik::System {
 namespace {
 
-using boost::asio::ip::tcp;
 using boost::system::error_code;
+
+// The failures of one peer, made in advance, so that reporting them needs no memory.
+struct PeerFailures {
+  explicit PeerFailures(const std::string& peer)
+      : closed("The connection to " + peer + " was closed on this side."),
+        noMemory("There is not enough memory for the connection to " + peer + ".") {}
+
+  // `operation` is "Cannot connect to ", for example.
+  IOException Of(const char* operation, const std::string& peer,
+                 const std::string& cause) const noexcept {
+    try {
+      return IOException(operation + peer + ": " + cause);
+    } catch (const std::bad_alloc&) {
+      return noMemory;
+    }
+  }
+  IOException Of(const char* operation, const std::string& peer,
+                 const error_code& cause) const noexcept {
+    try {
+      return Of(operation, peer, cause.message());
+    } catch (const std::bad_alloc&) {
+      return noMemory;
+    }
+  }
+
+  CancelledException closed;
+  IOException noMemory;
+};
+
+HostAddresses NoLookUpThread() noexcept {
+  try {
+    return {{}, "the thread for the host look-up cannot start"};
+  } catch (const std::bad_alloc&) {
+    return {};
+  }
+}
 
 // The socket is called with the mutex held; completions run without it. An operation that has
 // started on the socket is ended by its own handler, since the caller's buffer is in use until
-// then; the handler checks `closed_` first. `Close` itself ends only a connect that still waits for
-// its lookup.
-class TCPClientSocketImpl final : public TCPClientSocket, public ObjectImpl {
+// then; the handler checks `closed_` first. A connect is ended by `Close` itself. Handlers are in
+// memory of this object, so that no operation can fail for want of memory once the connect has
+// begun.
+class TCPClientSocketImpl final : public TCPClientSocket,
+                                  public ConnectProgress,
+                                  public ObjectImpl {
  public:
-  explicit TCPClientSocketImpl(ThreadPoolImpl& pool)
-      : pool_(&pool), socket_(pool.IoContext()), peer_("nobody") {}
+  TCPClientSocketImpl(ThreadPoolImpl& pool, ConnectRules rules)
+      : pool_(&pool), rules_(std::move(rules)), socket_(pool.IoContext()) {}
 
   void ConnectAsync(const std::string& host, int port, ConnectCompletion completion) override;
   void ReadAsync(char* buffer, std::size_t size, ReadCompletion completion) override;
   void WriteAsync(const char* data, std::size_t size, WriteCompletion completion) override;
   void Close() noexcept override;
   std::string ToString() const override;
+  ConnectStage Stage() const noexcept override;
 
  private:
   enum class Phase { kNew, kLookingUp, kConnecting, kConnected, kFailed };
   using Self = Ref<TCPClientSocketImpl>;
 
   void StartLookUp(const std::string& host, int port);
-  void OnLookedUp(const HostAddresses& found);
-  void TryNextAddress(std::string cause);
-  bool BeginConnect(const SocketAddress& address, const std::string& cause, error_code& error);
-  void OnConnected(const error_code& error, const std::string& previousCause);
+  void LookUp(const std::string& host, int port);
+  void EndLookUp(HostAddresses found) noexcept;
+  void OnLookedUp();
+  void OnConnected(TCPSocket& winner, const error_code& error);
   void EndConnect(Exception* error);
+  void CancelConnect() noexcept;  // called with the mutex held
+  ConnectCompletion TakeConnectCompletion();
 
+  void RequireOwnProcess() const;
   void RequireIdle(bool busy, const char* operation) const;
-  void OnRead(const error_code& error, std::size_t bytesRead, const ReadCompletion& completion);
+  void OnRead(const error_code& error, std::size_t bytesRead);
   void BeginWrite();
   void OnWritten(const error_code& error, std::size_t bytesWritten);
   void EndWrite(Exception* error);
-  CancelledException ClosedError() const {
-    return CancelledException("The connection to " + peer_ + " was closed on this side.");
-  }
 
   const Ref<ThreadPoolImpl> pool_;
+  const ForkMark mark_;
+  const ConnectRules rules_;
   mutable std::mutex mutex_;
-  tcp::socket socket_;
-  std::string peer_;  // set once, by ConnectAsync
-  Phase phase_ = Phase::kNew;
+  TCPSocket socket_;
+  // Both are set once, by `ConnectAsync`.
+  std::string peer_ = "nobody";
+  PeerFailures failures_{peer_};
+  std::atomic<Phase> phase_ = Phase::kNew;  // written with the mutex held
   bool closed_ = false;
   ConnectCompletion connectCompletion_;
-  std::vector<SocketAddress> addresses_;  // those not tried yet, the next one last
+  HostAddresses found_;
+  Ref<ConnectRace> race_;
   bool reading_ = false;
+  ReadCompletion readCompletion_;
   bool writing_ = false;
   const char* unwritten_ = nullptr;
   std::size_t unwrittenSize_ = 0;
   WriteCompletion writeCompletion_;
+  HandlerMemory lookUpMemory_;
+  HandlerMemory closeMemory_;
+  HandlerMemory readMemory_;
+  HandlerMemory writeMemory_;
 };
 
-// These errors only say that this host cannot use the address; the failure of another address is
-// reported instead, if there is one.
-bool IsUnusableAddress(const error_code& error) {
-  namespace Error = boost::asio::error;
-  return error == Error::network_unreachable || error == Error::address_family_not_supported ||
-         error == Error::make_error_code(static_cast<Error::basic_errors>(EADDRNOTAVAIL));
-}
-
-tcp::endpoint ToEndpoint(const SocketAddress& address) {
-  tcp::endpoint endpoint;
-  std::memcpy(endpoint.data(), &address.storage, address.length);
-  endpoint.resize(address.length);
-  return endpoint;
-}
-
 std::string TCPClientSocketImpl::ToString() const {
+  if (mark_.IsFromParent()) {
+    return "<TCPClientSocket:of the parent process>";
+  }
   const std::lock_guard lock(mutex_);
   return "<TCPClientSocket:" + peer_ + ">";
+}
+
+ConnectStage TCPClientSocketImpl::Stage() const noexcept {
+  switch (phase_.load()) {
+    case Phase::kNew:
+    case Phase::kLookingUp:
+      return ConnectStage::kLookUp;
+    case Phase::kConnecting:
+      return ConnectStage::kConnection;
+    default:
+      return ConnectStage::kConnected;
+  }
 }
 
 void TCPClientSocketImpl::ConnectAsync(const std::string& host, int port,
@@ -95,100 +149,132 @@ void TCPClientSocketImpl::ConnectAsync(const std::string& host, int port,
   if (port < 1 || port > 65535) {
     throw InvalidArgumentException("The port " + std::to_string(port) + " is not 1 to 65535.");
   }
+  RequireOwnProcess();
+  std::string peer = DescribeEndpoint(host, port);
+  PeerFailures failures(peer);
+  const auto race =
+      MakeRef<ConnectRace>(pool_->IoContext(), rules_.attemptDelay,
+                           [self = Self(this)](TCPSocket& winner, const error_code& error) {
+                             self->OnConnected(winner, error);
+                           });
   {
     const std::lock_guard lock(mutex_);
     if (phase_ != Phase::kNew) {
       throw InvalidStateException("The socket was already asked to connect.");
     }
-    phase_ = Phase::kLookingUp;
-    peer_ = DescribeEndpoint(host, port);
+    peer_.swap(peer);
+    failures_ = failures;
     connectCompletion_ = std::move(completion);
+    if (closed_) {
+      CancelConnect();
+      return;
+    }
+    phase_ = Phase::kLookingUp;
+    race_ = race;
   }
   StartLookUp(host, port);
 }
 
 void TCPClientSocketImpl::StartLookUp(const std::string& host, int port) {
-  const auto lookUp = [self = Self(this), host, port] {
-    self->pool_->Post([self, found = LookUpHost(host, port)] { self->OnLookedUp(found); });
-  };
   if (IsAddressLiteral(host)) {
-    lookUp();
+    LookUp(host, port);
     return;
   }
-  pool_->RunLookup(lookUp);
+  try {
+    std::function<void()> lookUp = [self = Self(this), host, port] { self->LookUp(host, port); };
+    if (rules_.runLookUp) {
+      rules_.runLookUp(std::move(lookUp));
+    } else {
+      pool_->RunLookup(std::move(lookUp));
+    }
+  } catch (const std::exception&) {
+    // This may be an I/O thread, and the caller expects failures in the completion.
+    EndLookUp(NoLookUpThread());
+  }
 }
 
-void TCPClientSocketImpl::OnLookedUp(const HostAddresses& found) {
+void TCPClientSocketImpl::LookUp(const std::string& host, int port) {
+  try {
+    EndLookUp(rules_.lookUp(host, port));
+  } catch (const std::bad_alloc&) {
+    EndLookUp({});
+  }
+}
+
+void TCPClientSocketImpl::EndLookUp(HostAddresses found) noexcept {
   {
     const std::lock_guard lock(mutex_);
+    found_ = std::move(found);
+  }
+  boost::asio::post(pool_->IoContext(),
+                    WithMemory(lookUpMemory_, [self = Self(this)] { self->OnLookedUp(); }));
+}
+
+void TCPClientSocketImpl::OnLookedUp() {
+  HostAddresses found;
+  Ref<ConnectRace> race;
+  {
+    const std::lock_guard lock(mutex_);
+    std::swap(found, found_);
+    race = race_;
     if (phase_ != Phase::kLookingUp) {
       return;  // ended by Close
     }
     phase_ = Phase::kConnecting;
-    addresses_.assign(found.addresses.rbegin(), found.addresses.rend());
   }
-  TryNextAddress(found.error);
+  if (found.addresses.empty()) {
+    IOException error = found.error.empty()
+                            ? failures_.noMemory
+                            : failures_.Of("Cannot connect to ", peer_, found.error);
+    EndConnect(&error);
+    return;
+  }
+  try {
+    race->Start(found.addresses);
+  } catch (const std::bad_alloc&) {
+    IOException error = failures_.noMemory;
+    EndConnect(&error);
+  }
 }
 
-void TCPClientSocketImpl::TryNextAddress(std::string cause) {
+void TCPClientSocketImpl::OnConnected(TCPSocket& winner, const error_code& error) {
+  if (error) {
+    IOException failure = failures_.Of("Cannot connect to ", peer_, error);
+    EndConnect(&failure);
+    return;
+  }
   {
     const std::lock_guard lock(mutex_);
-    while (!closed_ && !addresses_.empty()) {
-      const SocketAddress address = addresses_.back();
-      addresses_.pop_back();
-      error_code error;
-      if (BeginConnect(address, cause, error)) {
-        return;
-      }
-      cause = cause.empty() || !IsUnusableAddress(error) ? error.message() : cause;
+    if (!closed_) {
+      socket_.TakeOver(winner);
     }
   }
-  IOException error("Cannot connect to " + peer_ + ": " + cause);
-  EndConnect(&error);
+  EndConnect(nullptr);
 }
 
-bool TCPClientSocketImpl::BeginConnect(const SocketAddress& address, const std::string& cause,
-                                       error_code& error) {
-  error_code ignored;
-  socket_.close(ignored);
-  socket_.open(address.storage.ss_family == AF_INET6 ? tcp::v6() : tcp::v4(), error);
-  if (error) {
-    return false;
-  }
-  socket_.set_option(tcp::no_delay(true), ignored);
-  socket_.async_connect(ToEndpoint(address), [self = Self(this), cause](const error_code& result) {
-    self->OnConnected(result, cause);
-  });
-  return true;
-}
-
-void TCPClientSocketImpl::OnConnected(const error_code& error, const std::string& previousCause) {
-  if (!error) {
-    EndConnect(nullptr);
-    return;
-  }
-  const bool keepsPrevious = IsUnusableAddress(error) && !previousCause.empty();
-  TryNextAddress(keepsPrevious ? previousCause : error.message());
-}
-
+// Does nothing after `Close` has ended the connect.
 void TCPClientSocketImpl::EndConnect(Exception* error) {
   ConnectCompletion completion;
-  bool wasClosed = false;
+  Ref<ConnectRace> race;
   {
     const std::lock_guard lock(mutex_);
+    race.swap(race_);
+    if (phase_ != Phase::kConnecting) {
+      return;
+    }
     phase_ = error == nullptr ? Phase::kConnected : Phase::kFailed;
-    wasClosed = closed_;
-    completion = std::exchange(connectCompletion_, nullptr);
+    completion.swap(connectCompletion_);
   }
-  if (!completion) {
-    return;
+  if (completion) {
+    completion(this, error);
   }
-  if (wasClosed) {
-    CancelledException cancelled = ClosedError();
-    completion(this, &cancelled);
-    return;
+}
+
+// Another thread may have held the mutex when this process was forked.
+void TCPClientSocketImpl::RequireOwnProcess() const {
+  if (mark_.IsFromParent()) {
+    throw InvalidStateException("The socket belongs to the parent process.");
   }
-  completion(this, error);
 }
 
 void TCPClientSocketImpl::RequireIdle(bool busy, const char* operation) const {
@@ -204,37 +290,39 @@ void TCPClientSocketImpl::ReadAsync(char* buffer, std::size_t size, ReadCompleti
   if (size == 0) {
     throw InvalidArgumentException("A read needs room for at least one byte.");
   }
+  RequireOwnProcess();
   const std::lock_guard lock(mutex_);
   RequireIdle(reading_, "read");
   reading_ = true;
+  readCompletion_ = std::move(completion);
   if (closed_) {
-    pool_->Post([self = Self(this), completion = std::move(completion)] {
-      self->OnRead({}, 0, completion);
-    });
+    boost::asio::post(pool_->IoContext(),
+                      WithMemory(readMemory_, [self = Self(this)] { self->OnRead({}, 0); }));
     return;
   }
-  socket_.async_read_some(boost::asio::buffer(buffer, size),
-                          [self = Self(this), completion = std::move(completion)](
-                              const error_code& error, std::size_t bytesRead) {
-                            self->OnRead(error, bytesRead, completion);
-                          });
+  socket_->async_read_some(
+      boost::asio::buffer(buffer, size),
+      WithMemory(readMemory_, [self = Self(this)](const error_code& error, std::size_t bytesRead) {
+        self->OnRead(error, bytesRead);
+      }));
 }
 
-void TCPClientSocketImpl::OnRead(const error_code& error, std::size_t bytesRead,
-                                 const ReadCompletion& completion) {
+void TCPClientSocketImpl::OnRead(const error_code& error, std::size_t bytesRead) {
+  ReadCompletion completion;
   bool wasClosed = false;
   {
     const std::lock_guard lock(mutex_);
     reading_ = false;
     wasClosed = closed_;
+    completion.swap(readCompletion_);
   }
   if (wasClosed) {
-    CancelledException cancelled = ClosedError();
+    CancelledException cancelled = failures_.closed;
     completion(0, &cancelled);
     return;
   }
   if (error && error != boost::asio::error::eof) {
-    IOException failure("Cannot read from " + peer_ + ": " + error.message());
+    IOException failure = failures_.Of("Cannot read from ", peer_, error);
     completion(0, &failure);
     return;
   }
@@ -243,6 +331,7 @@ void TCPClientSocketImpl::OnRead(const error_code& error, std::size_t bytesRead,
 
 void TCPClientSocketImpl::WriteAsync(const char* data, std::size_t size,
                                      WriteCompletion completion) {
+  RequireOwnProcess();
   const std::lock_guard lock(mutex_);
   RequireIdle(writing_, "write");
   writing_ = true;
@@ -250,17 +339,19 @@ void TCPClientSocketImpl::WriteAsync(const char* data, std::size_t size,
   unwrittenSize_ = size;
   writeCompletion_ = std::move(completion);
   if (closed_ || size == 0) {
-    pool_->Post([self = Self(this)] { self->OnWritten({}, 0); });
+    boost::asio::post(pool_->IoContext(),
+                      WithMemory(writeMemory_, [self = Self(this)] { self->OnWritten({}, 0); }));
     return;
   }
   BeginWrite();
 }
 
 void TCPClientSocketImpl::BeginWrite() {
-  socket_.async_write_some(boost::asio::buffer(unwritten_, unwrittenSize_),
-                           [self = Self(this)](const error_code& error, std::size_t bytesWritten) {
-                             self->OnWritten(error, bytesWritten);
-                           });
+  socket_->async_write_some(boost::asio::buffer(unwritten_, unwrittenSize_),
+                            WithMemory(writeMemory_, [self = Self(this)](const error_code& error,
+                                                                         std::size_t bytesWritten) {
+                              self->OnWritten(error, bytesWritten);
+                            }));
 }
 
 void TCPClientSocketImpl::OnWritten(const error_code& error, std::size_t bytesWritten) {
@@ -274,7 +365,7 @@ void TCPClientSocketImpl::OnWritten(const error_code& error, std::size_t bytesWr
     }
   }
   if (error) {
-    IOException failure("Cannot write to " + peer_ + ": " + error.message());
+    IOException failure = failures_.Of("Cannot write to ", peer_, error);
     EndWrite(&failure);
     return;
   }
@@ -288,10 +379,10 @@ void TCPClientSocketImpl::EndWrite(Exception* error) {
     const std::lock_guard lock(mutex_);
     writing_ = false;
     wasCutOff = closed_;
-    completion = std::exchange(writeCompletion_, nullptr);
+    completion.swap(writeCompletion_);
   }
   if (wasCutOff) {
-    CancelledException cancelled = ClosedError();
+    CancelledException cancelled = failures_.closed;
     completion(&cancelled);
     return;
   }
@@ -299,23 +390,50 @@ void TCPClientSocketImpl::EndWrite(Exception* error) {
 }
 
 void TCPClientSocketImpl::Close() noexcept {
-  const std::lock_guard lock(mutex_);
-  if (closed_) {
+  if (mark_.IsFromParent()) {
     return;
   }
-  closed_ = true;
-  error_code ignored;
-  socket_.close(ignored);
-  if (phase_ == Phase::kLookingUp) {
-    phase_ = Phase::kFailed;
-    pool_->Post([self = Self(this)] { self->EndConnect(nullptr); });
+  Ref<ConnectRace> race;
+  {
+    const std::lock_guard lock(mutex_);
+    if (closed_) {
+      return;
+    }
+    closed_ = true;
+    socket_.Close();
+    race.swap(race_);
+    if (phase_ == Phase::kLookingUp || phase_ == Phase::kConnecting) {
+      CancelConnect();
+    }
   }
+  if (race != nullptr) {
+    race->Cancel();
+  }
+}
+
+void TCPClientSocketImpl::CancelConnect() noexcept {
+  phase_ = Phase::kFailed;
+  boost::asio::post(pool_->IoContext(), WithMemory(closeMemory_, [self = Self(this)] {
+                      CancelledException cancelled = self->failures_.closed;
+                      if (const auto completion = self->TakeConnectCompletion()) {
+                        completion(self.get(), &cancelled);
+                      }
+                    }));
+}
+
+TCPClientSocket::ConnectCompletion TCPClientSocketImpl::TakeConnectCompletion() {
+  const std::lock_guard lock(mutex_);
+  return std::exchange(connectCompletion_, nullptr);
 }
 
 }  // namespace
 
 Ref<TCPClientSocket> CreateTCPClientSocket(ThreadPool* pool) {
-  return MakeRef<TCPClientSocketImpl>(ToThreadPoolImpl(pool));
+  return CreateTCPClientSocket(ToThreadPoolImpl(pool), {});
+}
+
+Ref<TCPClientSocket> CreateTCPClientSocket(ThreadPoolImpl& pool, ConnectRules rules) {
+  return MakeRef<TCPClientSocketImpl>(pool, std::move(rules));
 }
 
 }  // namespace Tarnik::System

@@ -51,6 +51,14 @@ TEST_F(CookieStoreTest, KeepsEveryCharacterOfTheValue) {
   EXPECT_EQ(Header(), "id=\"a b=c,d\"");
 }
 
+TEST_F(CookieStoreTest, TheFullStopOfTheRootMakesNoOtherHost) {
+  Store("a=1", "sts.example.");
+  Store("b=2; Domain=sts.example", "sts.example.");
+  EXPECT_EQ(Header("sts.example."), "a=1; b=2");
+  EXPECT_EQ(Header("sts.example"), "a=1; b=2");
+  EXPECT_EQ(Header("other.example."), "");
+}
+
 TEST_F(CookieStoreTest, TrimsTabsAroundNameAndValue) {
   Store("\tid\t=\t42\t;\tPath\t=\t/");
   EXPECT_EQ(Header("sts.example", "/"), "id=42");

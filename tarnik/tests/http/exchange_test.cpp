@@ -8,6 +8,7 @@
 #include <thread>
 #include <vector>
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <tarnik/core/exception.h>
@@ -218,6 +219,17 @@ class StalledExchangeTest : public ExchangeFixture, public testing::WithParamInt
            Eventually([&] { return !spec_->Streams().front()->Written().empty(); });
   }
 
+  static std::string AwaitedText() {
+    switch (GetParam()) {
+      case Stage::kConnect:
+        return "the connection";
+      case Stage::kWrite:
+        return "the request to be sent";
+      default:
+        return "the answer";
+    }
+  }
+
   void ExpectReleased() {
     if (GetParam() == Stage::kConnect) {
       EXPECT_EQ(spec_->CancelCount(), 1U);
@@ -244,7 +256,9 @@ TEST_P(StalledExchangeTest, EndsOnceAtItsOwnTimeLimit) {
   const auto record = std::make_shared<CompletionRecord>();
   const auto item = Send(record, 20000);
   EXPECT_THROW(agent_->Wait(item.get(), kPlentyOfTime), TimeoutException);
-  EXPECT_EQ(record->message, "No answer from sts.example:443 within 20 milliseconds.");
+  EXPECT_THAT(record->message,
+              testing::StartsWith(
+                  "No answer from sts.example:443 within 20 milliseconds: waiting for the "));
   EXPECT_TRUE(Eventually([&] { return record.use_count() == 1; }));
   EXPECT_EQ(record->count, 1);
 }
@@ -253,9 +267,12 @@ TEST_P(StalledExchangeTest, EndsOnceAtTheWaitersTimeLimit) {
   const auto record = std::make_shared<CompletionRecord>();
   const auto item = Send(record);
   ASSERT_TRUE(IsStalled());
-  EXPECT_THROW(agent_->Wait(item.get(), 1500), TimeoutException);
+  // Long enough for the completion of the write.
+  EXPECT_THROW(agent_->Wait(item.get(), 150000), TimeoutException);
   EXPECT_EQ(record->count, 1);
-  EXPECT_EQ(record->message, "No answer from sts.example:443 within 1500 microseconds.");
+  EXPECT_EQ(
+      record->message,
+      "No answer from sts.example:443 within 150 milliseconds: waiting for " + AwaitedText() + ".");
   ExpectReleased();
   EXPECT_FALSE(item->Cancel());
 }
@@ -335,8 +352,8 @@ TEST_P(TimeoutMessageTest, NamesTheLimit) {
   const auto record = std::make_shared<CompletionRecord>();
   const auto item = Send(record, GetParam().microseconds);
   EXPECT_THROW(agent_->Wait(item.get(), 0), TimeoutException);
-  EXPECT_EQ(record->message,
-            std::string("No answer from sts.example:443 within ") + GetParam().text + ".");
+  EXPECT_EQ(record->message, std::string("No answer from sts.example:443 within ") +
+                                 GetParam().text + ": waiting for the connection.");
 }
 
 INSTANTIATE_TEST_SUITE_P(Durations, TimeoutMessageTest,

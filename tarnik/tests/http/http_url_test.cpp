@@ -54,6 +54,7 @@ INSTANTIATE_TEST_SUITE_P(
         GoodUrl{"http://localhost/a%20b?c=%41%fF", false, "localhost", 80, "/a%20b?c=%41%fF"},
         GoodUrl{"http://a_b.c-d.3e/~!$&'()*+,;=:@-._", false, "a_b.c-d.3e", 80,
                 "/~!$&'()*+,;=:@-._"},
+        GoodUrl{"https://sts.example.com.:8443/", true, "sts.example.com.", 8443, "/"},
         GoodUrl{"http://h/a@b:c", false, "h", 80, "/a@b:c"},
         GoodUrl{"http://h//x/../y", false, "h", 80, "//x/../y"}));
 
@@ -108,7 +109,8 @@ INSTANTIATE_TEST_SUITE_P(
         BadUrl{"https://st\xC3\xA9.example/", "it holds a character outside ASCII"},
         BadUrl{"https://sts.example/\xC3\xA9", "it holds a character outside ASCII"},
         BadUrl{"https://sts..example/", kHost}, BadUrl{"https://.sts/", kHost},
-        BadUrl{"https://sts.example./", kHost}, BadUrl{"https://-sts.example/", kHost},
+        BadUrl{"https://sts.example../", kHost}, BadUrl{"https://./", kHost},
+        BadUrl{"https://127.0.0.1./", kHost}, BadUrl{"https://-sts.example/", kHost},
         BadUrl{"https://sts-/", kHost}, BadUrl{"https://sts%2Eexample/", kHost},
         BadUrl{"https://a,b/", kHost}, BadUrl{"https://a\\b/", kHost},
         BadUrl{"https://256.1.1.1/", kHost}, BadUrl{"https://1.2.3/", kHost},
@@ -158,6 +160,8 @@ TEST(ParseHttpURLTest, AcceptsTheLongestNameAndRefusesALongerOne) {
   std::string path;
   ParseHttpURL("http://" + longest, isHttps, host, port, path);
   EXPECT_EQ(host, longest);
+  ParseHttpURL("http://" + longest + ".", isHttps, host, port, path);
+  EXPECT_EQ(host, longest + ".");
   EXPECT_THROW(ParseHttpURL("http://" + longest + "a", isHttps, host, port, path),
                InvalidArgumentException);
 }

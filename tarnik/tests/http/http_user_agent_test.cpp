@@ -58,6 +58,8 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(HostCase{"sts.example", "sts.example:443", true, "sts.example"},
                     HostCase{"sts.example", "sts.example:80", false, "sts.example"},
                     HostCase{"sts.example", "sts.example:443", false, "sts.example:443"},
+                    HostCase{"sts.example.", "sts.example.:8443", true, "sts.example.:8443"},
+                    HostCase{"sts.example.", "sts.example.:443", true, "sts.example."},
                     HostCase{"sts.example", "sts.example:80", true, "sts.example:80"},
                     HostCase{"sts.example", "sts.example:7444", true, "sts.example:7444"},
                     HostCase{"sts.example", "sts.example", true, "sts.example"},

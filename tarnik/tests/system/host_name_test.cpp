@@ -30,6 +30,18 @@ TEST(HostNameTest, DistinguishesAddressesFromNames) {
   }
 }
 
+TEST(HostNameTest, ANameMayEndWithTheFullStopOfTheRoot) {
+  EXPECT_EQ(WithoutRootDot("sts.example."), "sts.example");
+  EXPECT_EQ(WithoutRootDot("sts.example"), "sts.example");
+  EXPECT_EQ(WithoutRootDot("."), ".");
+  EXPECT_TRUE(IsDnsName("sts.example."));
+  for (const char* host : {".", "..", "sts.example..", "127.0.0.1.", "sts.1."}) {
+    EXPECT_FALSE(IsDnsName(host)) << host;
+  }
+  EXPECT_NO_THROW(RequireHostName(std::string(253, 'a') + "."));
+  EXPECT_THROW(RequireHostName(std::string(254, 'a') + "."), InvalidArgumentException);
+}
+
 TEST(HostNameTest, DescribesEndpoints) {
   EXPECT_EQ(DescribeEndpoint("sts.example", 443), "sts.example:443");
   EXPECT_EQ(DescribeEndpoint("::1", 8443), "[::1]:8443");

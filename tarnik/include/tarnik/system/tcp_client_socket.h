@@ -6,6 +6,7 @@
 
 #include <tarnik/core/exception.h>
 #include <tarnik/core/ref.h>
+#include <tarnik/system/cancellable_item.h>
 #include <tarnik/system/stream.h>
 #include <tarnik/system/thread_pool.h>
 
@@ -17,9 +18,12 @@ class TARNIK_EXPORT TCPClientSocket : public Stream {
   using ConnectCompletion = std::function<void(TCPClientSocket*, Exception*)>;
 
   /// Resolves `host` (a name or a literal IPv4 or IPv6 address, without brackets) and connects to
-  /// `port`, trying each of its addresses in turn. The completion receives this socket and null, or
-  /// this socket and an `IOException` that names host, port and the last cause, or a
-  /// `CancelledException` after `Close`. Called once per socket.
+  /// `port` at the first of its addresses that accepts the connection. The families of addresses
+  /// take turns, and the next address is tried when the one before it has failed or has not
+  /// answered for 250 ms (RFC 8305, sections 4 and 5). The completion receives this socket and
+  /// null, or this socket and an `IOException` that names host, port and the last cause, or a
+  /// `CancelledException` after `Close`. A shortage of threads or memory after this call has
+  /// returned is such an `IOException` too. Called once per socket.
   ///
   /// Throws `InvalidArgumentException` when `host` cannot be a host name (empty, too long, blanks,
   /// control characters, brackets, ...) or `port` is not 1 to 65535, and `InvalidStateException`
@@ -31,6 +35,12 @@ class TARNIK_EXPORT TCPClientSocket : public Stream {
 /// A new, unconnected socket whose completions run on the I/O threads of `pool`. Throws
 /// `InvalidArgumentException` unless `pool` is the one that `GetThreadPool` returns.
 TARNIK_EXPORT Ref<TCPClientSocket> CreateTCPClientSocket(ThreadPool* pool);
+
+/// An item for a connect of `socket`, of which it holds one reference. `Cancel` closes the socket
+/// and returns true. A user agent whose time limit passes during a connect with such an item can
+/// say whether it was waiting for the host look-up or for the connection. Throws
+/// `InvalidArgumentException` when `socket` is null.
+TARNIK_EXPORT Ref<CancellableItem> CreateConnectItem(TCPClientSocket* socket);
 
 }  // namespace Tarnik::System
 

@@ -1,0 +1,225 @@
+#include <algorithm>
+#include <atomic>
+#include <chrono>
+#include <condition_variable>
+#include <memory>
+#include <mutex>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/http/bounded_user_agent.h>
+#include <tarnik/system/thread_pool.h>
+
+#include "core/copy_exception.h"
+
+namespace Tarnik::Http {
+namespace {
+
+constexpr const char* kDeadlinePassed = "The caller's deadline has passed.";
+constexpr const char* kCancelled = "The call was cancelled by its caller.";
+
+// An exchange of a bounded agent. Without an inner item it was refused.
+class BoundedExchange final : public PendingRequestItem, public ObjectImpl {
+ public:
+  explicit BoundedExchange(UserAgent::Completion completion) : completion_(std::move(completion)) {}
+
+  bool Cancel() override {
+    const Ref<PendingRequestItem> inner = Inner();
+    return inner != nullptr && inner->Cancel();
+  }
+
+  Ref<PendingRequestItem> Inner() const {
+    const std::lock_guard lock(mutex_);
+    return inner_;
+  }
+  void SetInner(const Ref<PendingRequestItem>& inner) {
+    const std::lock_guard lock(mutex_);
+    inner_ = inner;
+  }
+
+  /// Ends the exchange without having begun it.
+  void Refuse(std::shared_ptr<Exception> failure) {
+    System::GetThreadPool()->Post([self = Ref<BoundedExchange>(this), failure] {
+      self->Complete(failure.get(), nullptr);
+      {
+        const std::lock_guard lock(self->mutex_);
+        self->refusal_ = failure;
+      }
+      self->refused_.notify_all();
+    });
+  }
+  /// Waits until the completion of a refused exchange has run.
+  std::shared_ptr<Exception> WaitForRefusal() {
+    std::unique_lock lock(mutex_);
+    refused_.wait(lock, [this] { return refusal_ != nullptr; });
+    return refusal_;
+  }
+
+  void Complete(Exception* failure, ClientResponse* response) {
+    const auto completion = std::exchange(completion_, nullptr);
+    completion(failure, response, this);
+  }
+
+ private:
+  ~BoundedExchange() override = default;
+
+  mutable std::mutex mutex_;
+  std::condition_variable refused_;
+  Ref<PendingRequestItem> inner_;
+  std::shared_ptr<Exception> refusal_;
+  UserAgent::Completion completion_;  // used once
+};
+
+class CallLimitImpl final : public CallLimit, public ObjectImpl {
+ public:
+  explicit CallLimitImpl(Clock::time_point deadline) : deadline_(deadline) {}
+
+  Clock::time_point Deadline() const noexcept override { return deadline_; }
+  bool IsCancelled() const noexcept override { return isCancelled_; }
+  std::string ToString() const override { return "<CallLimit>"; }
+
+  void Cancel() override {
+    std::vector<Ref<BoundedExchange>> underWay;
+    {
+      const std::lock_guard lock(mutex_);
+      isCancelled_ = true;
+      underWay.swap(underWay_);
+    }
+    for (const auto& exchange : underWay) {
+      exchange->Cancel();
+    }
+  }
+
+  /// False when the limit is cancelled already.
+  bool Add(const Ref<BoundedExchange>& exchange) {
+    const std::lock_guard lock(mutex_);
+    if (isCancelled_) {
+      return false;
+    }
+    underWay_.push_back(exchange);
+    return true;
+  }
+  void Remove(const Ref<BoundedExchange>& exchange) {
+    const std::lock_guard lock(mutex_);
+    std::erase(underWay_, exchange);
+  }
+
+  bool HasPassed() const { return Clock::now() >= deadline_; }
+
+  /// The shorter of `microseconds`, where 0 means no limit, and the time that is left.
+  unsigned long Shorten(unsigned long microseconds) const {
+    if (deadline_ == Clock::time_point::max()) {
+      return microseconds;
+    }
+    // Rounded up, since messages contain it, and since 0 would mean no limit.
+    const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline_ - Clock::now());
+    const auto leftMicroseconds =
+        static_cast<unsigned long>(std::max(left, std::chrono::milliseconds(1)).count()) * 1000;
+    return microseconds == 0 ? leftMicroseconds : std::min(microseconds, leftMicroseconds);
+  }
+
+ private:
+  ~CallLimitImpl() override = default;
+
+  const Clock::time_point deadline_;
+  std::atomic<bool> isCancelled_{false};
+  std::mutex mutex_;
+  std::vector<Ref<BoundedExchange>> underWay_;
+};
+
+// `failure` as the caller of a bounded agent sees it.
+std::shared_ptr<Exception> Translate(const CallLimitImpl& limit, const Exception& failure) {
+  if (dynamic_cast<const TimeoutException*>(&failure) != nullptr && limit.HasPassed()) {
+    return std::make_shared<TimeoutException>(std::string(kDeadlinePassed) + " " +
+                                              failure.Message());
+  }
+  return CopyException(failure);
+}
+
+class BoundedUserAgent final : public UserAgent, public ObjectImpl {
+ public:
+  BoundedUserAgent(UserAgent* inner, Ref<CallLimitImpl> limit)
+      : inner_(inner), limit_(std::move(limit)) {}
+
+  Ref<PendingRequestItem> SendAsync(ClientRequest* request, Completion completion,
+                                    unsigned long timeoutMicroseconds) override {
+    if (!completion) {
+      throw InvalidArgumentException("The completion of an HTTP request is empty.");
+    }
+    const auto exchange = MakeRef<BoundedExchange>(std::move(completion));
+    if (!limit_->Add(exchange)) {
+      exchange->Refuse(std::make_shared<CancelledException>(kCancelled));
+      return exchange;
+    }
+    if (limit_->HasPassed()) {
+      limit_->Remove(exchange);
+      exchange->Refuse(std::make_shared<TimeoutException>(kDeadlinePassed));
+      return exchange;
+    }
+    Begin(request, exchange, timeoutMicroseconds);
+    return exchange;
+  }
+
+  Ref<ClientResponse> Wait(PendingRequestItem* item, unsigned long timeoutMicroseconds) override {
+    const Ref<BoundedExchange> exchange(CheckedCast<BoundedExchange>(item));
+    const Ref<PendingRequestItem> innerItem = exchange->Inner();
+    std::shared_ptr<Exception> failure;
+    if (innerItem == nullptr) {
+      failure = exchange->WaitForRefusal();
+    } else {
+      try {
+        return inner_->Wait(innerItem.get(), limit_->Shorten(timeoutMicroseconds));
+      } catch (const TimeoutException& timeout) {
+        failure = Translate(*limit_, timeout);
+      }
+    }
+    failure->Throw();
+    return nullptr;
+  }
+
+ private:
+  ~BoundedUserAgent() override = default;
+
+  void Begin(ClientRequest* request, const Ref<BoundedExchange>& exchange,
+             unsigned long timeoutMicroseconds) {
+    const auto complete = [limit = limit_, exchange](Exception* failure, ClientResponse* response,
+                                                     PendingRequestItem*) {
+      limit->Remove(exchange);
+      const auto translated = failure == nullptr ? nullptr : Translate(*limit, *failure);
+      exchange->Complete(translated.get(), response);
+    };
+    try {
+      exchange->SetInner(
+          inner_->SendAsync(request, complete, limit_->Shorten(timeoutMicroseconds)));
+    } catch (...) {
+      limit_->Remove(exchange);
+      throw;
+    }
+    // A `Cancel` before the inner item was known has not reached it.
+    if (limit_->IsCancelled()) {
+      exchange->Cancel();
+    }
+  }
+
+  const Ref<UserAgent> inner_;
+  const Ref<CallLimitImpl> limit_;
+};
+
+}  // namespace
+
+Ref<CallLimit> CreateCallLimit(CallLimit::Clock::time_point deadline) {
+  return MakeRef<CallLimitImpl>(deadline);
+}
+
+Ref<UserAgent> CreateBoundedUserAgent(UserAgent* inner, CallLimit* limit) {
+  if (inner == nullptr || limit == nullptr) {
+    throw InvalidArgumentException("A bounded user agent needs a user agent and a limit.");
+  }
+  return MakeRef<BoundedUserAgent>(inner, Ref<CallLimitImpl>(CheckedCast<CallLimitImpl>(limit)));
+}
+
+}  // namespace Tarnik::Http
