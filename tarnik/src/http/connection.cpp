@@ -20,7 +20,7 @@ Connection::Connection(Ref<System::Stream> stream)
       isSecure_(dynamic_cast<Ssl::SSLStream*>(stream_.get()) != nullptr) {}
 
 Connection::~Connection() {
-  stream_->Close();
+  Close();
   StringUtil::Cleanse(buffer_);
 }
 
@@ -88,7 +88,10 @@ void Connection::Write(std::string_view data, System::Stream::WriteCompletion co
 }
 
 void Connection::Close() noexcept {
-  stream_->Close();
+  // A stream of a caller may have locks that a thread of the parent held.
+  if (!mark_.IsFromParent()) {
+    stream_->Close();
+  }
 }
 
 void Connection::Watch(std::function<void()> onLost) {

@@ -13,6 +13,7 @@
 #include <tarnik/core/ref.h>
 #include <tarnik/system/stream.h>
 
+#include "support/fork.h"
 #include "system/handler_memory.h"
 
 namespace Tarnik::Http {
@@ -36,6 +37,7 @@ class Connection final : public ObjectImpl {
   void Read(ReadHandler handler);
   /// Writes all of `data`, which must live until the completion has run.
   void Write(std::string_view data, System::Stream::WriteCompletion completion);
+  /// Does nothing in a forked child, where the connection is the parent's.
   void Close() noexcept;
 
   /// Starts the idle time: `onLost` runs, on an I/O thread, when the connection can no longer be
@@ -59,6 +61,7 @@ class Connection final : public ObjectImpl {
 
   const Ref<System::Stream> stream_;
   const bool isSecure_;
+  const ForkMark mark_;
   std::mutex mutex_;
   std::string buffer_;
   ReadHandler handler_;

@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 
 #include "ssl/tls_fixture.h"
+#include "support/forked_child.h"
 #include "support/openssl.h"
 #include "support/test_pki.h"
 #include "support/tls_peer.h"
@@ -104,6 +105,16 @@ TEST_F(SessionCacheTest, DropsTheOldestSessionBeyondItsLimit) {
   EXPECT_EQ(cache_.Size(), SessionCache::kMaxSessions);
   EXPECT_EQ(cache_.Take("peer 0", now_), nullptr);
   EXPECT_NE(cache_.Take("peer 1", now_), nullptr);
+}
+
+TEST_F(SessionCacheTest, IsEmptyInAForkedChild) {
+  cache_.Put("peer", CopyOf(tls12_), now_);
+  EXPECT_TRUE(HoldsInChild([&] {
+    const bool wasEmpty = cache_.Take("peer", now_) == nullptr;
+    cache_.Put("peer", CopyOf(tls13_), now_);
+    return wasEmpty && cache_.Take("peer", now_) != nullptr;
+  }));
+  EXPECT_NE(cache_.Take("peer", now_), nullptr);
 }
 
 }  // namespace
