@@ -19,17 +19,14 @@ int main(int argc, char** argv) {
     const auto sslContext = Tarnik::Ssl::CreateSSLContext(tls);
     const auto trustedKeys = Tarnik::Xml::Security::CreateTrustedCertificatesResolver(
         Tarnik::Crypto::LoadCertificates(argv[3]));
-    bool isHttps = false;
-    int port = 0;
-    std::string host;
-    std::string path;
-    Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, path);
-
-    const auto connections =
-        Tarnik::Http::CreateTLSConnectionSpec(host, port, sslContext.get(), "");
     SsoClient::SecurityTokenServiceConfigEx config;
-    config.url = path;
-    config.userAgent = Tarnik::Http::CreateHttpUserAgent(connections.get(), nullptr, nullptr);
+    bool isHttps = false;
+    std::string host;
+    int port = 0;
+    Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, config.url);
+
+    const auto spec = Tarnik::Http::CreateTLSConnectionSpec(host, port, sslContext.get(), "");
+    config.userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
     config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
     const auto service = SsoClient::CreateSecurityTokenService(config);
 

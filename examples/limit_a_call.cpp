@@ -18,37 +18,30 @@ int main(int argc, char** argv) {
   try {
     Tarnik::Ssl::SSLContextConfig tls;
     tls.caFiles = {argv[2]};
-    const auto sslContext = Tarnik::Ssl::CreateSSLContext(tls);
+    const auto ssl = Tarnik::Ssl::CreateSSLContext(tls);
     const auto trustedKeys = Tarnik::Xml::Security::CreateTrustedCertificatesResolver(
         Tarnik::Crypto::LoadCertificates(argv[3]));
+    SsoClient::SecurityTokenServiceConfigEx config;
+    config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
     bool isHttps = false;
     int port = 0;
     std::string host;
-    std::string path;
-    Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, path);
+    Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, config.url);
 
     // Once in the program: the connections of this agent serve all calls.
-    const auto connections =
-        Tarnik::Http::CreateTLSConnectionSpec(host, port, sslContext.get(), "");
-    const auto userAgent = Tarnik::Http::CreateHttpUserAgent(connections.get(), nullptr, nullptr);
-
+    const auto spec = Tarnik::Http::CreateTLSConnectionSpec(host, port, ssl.get(), "");
+    const auto userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
     // For each call. `limit->Cancel()` would end it even earlier, on any thread.
-    const auto limit =
-        Tarnik::Http::CreateCallLimit(std::chrono::steady_clock::now() + std::chrono::seconds(2));
-    SsoClient::SecurityTokenServiceConfigEx config;
-    config.url = path;
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(2);
+    const auto limit = Tarnik::Http::CreateCallLimit(deadline);
     config.userAgent = Tarnik::Http::CreateBoundedUserAgent(userAgent.get(), limit.get());
-    config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
     const auto service = SsoClient::CreateSecurityTokenService(config);
-
-    SsoClient::TokenSpec spec;
-    spec.tokenLifetimeSec = 3600;
-    const auto token = service->AcquireToken(argv[4], password, spec);
+    SsoClient::TokenSpec request;
+    request.tokenLifetimeSec = 3600;
+    const auto token = service->AcquireToken(argv[4], password, request);
     std::cout << SsoClient::CreateSamlTokenDescription(*token) << '\n';
-    return 0;
   } catch (const SsoClient::CommunicationException& e) {
     std::cout << "given up: " << e.what() << '\n';
-    return 0;
   } catch (const std::exception& e) {
     std::cerr << "No token: " << e.what() << '\n';
     return 1;
