@@ -31,6 +31,7 @@ int main(int argc, char** argv) {
     // Once in the program: the connections of this agent serve all calls.
     const auto spec = Tarnik::Http::CreateTLSConnectionSpec(host, port, ssl.get(), "");
     const auto userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+
     // For each call. `limit->Cancel()` would end it even earlier, on any thread.
     const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(2);
     const auto limit = Tarnik::Http::CreateCallLimit(deadline);
