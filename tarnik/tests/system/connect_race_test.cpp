@@ -51,11 +51,11 @@ SocketAddress V4(int port) {
   return address;
 }
 
-/// An address of another family than IPv4; connecting to it fails.
 SocketAddress V6(int port) {
   SocketAddress address{};
   auto* const v6 = reinterpret_cast<sockaddr_in6*>(&address.storage);
   v6->sin6_family = AF_INET6;
+  v6->sin6_addr = in6addr_loopback;
   v6->sin6_port = htons(static_cast<in_port_t>(port));
   address.length = sizeof(sockaddr_in6);
   return address;
@@ -148,6 +148,17 @@ TEST(ConnectRaceAsyncTest, AFailureStartsTheNextAttemptAtOnce) {
   const int refusing = RefusingPort(holder);
   const LoopbackListener listener;
   const Connect connect({V4(refusing), Unusable(), V4(refusing), V4(listener.Port())}, 1h);
+  EXPECT_EQ(connect.Result(), "");
+}
+
+TEST(ConnectRaceAsyncTest, TheOtherFamilyIsTriedBeforeTheSecondAddressOfTheFirst) {
+  if (!HasIpv6Loopback()) {
+    GTEST_SKIP() << "this machine has no IPv6";
+  }
+  Descriptor holder;
+  const DeadListener dead;
+  const LoopbackListener listener(true);
+  const Connect connect({V4(RefusingPort(holder)), V4(dead.Port()), V6(listener.Port())}, 1h);
   EXPECT_EQ(connect.Result(), "");
 }
 
