@@ -78,7 +78,6 @@ class TCPClientSocketImpl final : public TCPClientSocket,
   std::atomic<Phase> phase_ = Phase::kNew;  // written with the mutex held
   bool closed_ = false;
   ConnectCompletion connectCompletion_;
-  bool hasLookUpEnded_ = false;
   HostAddresses found_;
   Ref<ConnectRace> race_;
   bool reading_ = false;
@@ -170,10 +169,6 @@ void TCPClientSocketImpl::LookUp(const std::string& host, int port) {
 void TCPClientSocketImpl::EndLookUp(HostAddresses found) noexcept {
   {
     const std::lock_guard lock(mutex_);
-    // A look-up may run although starting its thread has failed.
-    if (std::exchange(hasLookUpEnded_, true)) {
-      return;
-    }
     found_ = std::move(found);
   }
   boost::asio::post(pool_->IoContext(),
