@@ -30,7 +30,8 @@ constexpr std::string_view kUsage =
     "                     [--request-mic]\n"
     "Port 0 selects a free port. DIR receives ca.pem, signing.pem, client.pem and client-key.pem;\n"
     "machine@EXAMPLE.COM may ask for tokens with the client's key and certificate.\n"
-    "With --end-with-stdin, each line of standard input is a command: revoke ID.\n"
+    "With --end-with-stdin, each line of standard input is a command: revoke ID, stall (requests\n"
+    "are read and never answered), resume.\n"
     "With --no-resumption, TLS sessions are not resumed.\n"
     "With --keytab, users log in with Kerberos; FILE contains the service's keys. With --realm, "
     "the\n"
@@ -150,9 +151,20 @@ sigset_t EndSignals() {
   return signals;
 }
 
+void Stall(DevSts::Stall stall, DevSts::Server& server) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.stall = stall;
+  server.SetMisbehavior(misbehavior);
+}
+
 void Execute(const std::string& command, DevSts::Server& server) {
   constexpr std::string_view kRevoke = "revoke ";
   const std::lock_guard lock(outputMutex);
+  if (command == "stall" || command == "resume") {
+    Stall(command == "stall" ? DevSts::Stall::BeforeAnswer : DevSts::Stall::None, server);
+    std::cout << (command == "stall" ? "stalled" : "resumed") << std::endl;
+    return;
+  }
   if (command.rfind(kRevoke, 0) != 0) {
     std::cout << "unknown command: " << command << std::endl;
     return;

@@ -45,7 +45,12 @@ namespace SsoClient {
 /// every case above, the callback receives it. Any other exception, such as a `std::exception` from
 /// the caller's negotiation handler, leaves the worker thread and terminates the process. Arguments
 /// are copied, except tokens and negotiation handlers, which are passed by reference: the caller
-/// keeps them alive until the callback has returned. The service may be released earlier.
+/// keeps them alive until the callback has returned. The service may be released earlier. At most
+/// 256 asynchronous operations run at the same time in a process; further ones wait in a queue.
+///
+/// Time-outs are fixed. To give up earlier, use a service with a bounded user agent
+/// (`tarnik/http/bounded_user_agent.h`): an asynchronous operation that is only abandoned keeps its
+/// thread until its time-out, and delays the others when there are 256 of them.
 class SecurityTokenService {
  public:
   /// Receives a token and null, or null and the exception, which is valid only during the call.

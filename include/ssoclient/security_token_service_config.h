@@ -38,7 +38,8 @@ struct SecurityTokenServiceConfig {
   bool flag = false;
 };
 
-/// The same for callers with their own HTTP user agent.
+/// The same for callers with their own HTTP user agent: to keep connections between operations
+/// (`tarnik/http/connection_specs.h`) or to limit calls (`tarnik/http/bounded_user_agent.h`).
 struct SecurityTokenServiceConfigEx {
   /// The request target of every POST, used unchanged.
   std::string url;

@@ -1,5 +1,6 @@
 #include "faults/fault_injection.h"
 
+#include <atomic>
 #include <cstddef>
 #include <cstdlib>
 #include <new>
@@ -12,32 +13,36 @@ namespace SsoClient::Testing {
 namespace {
 
 struct Plan {
-  bool isArmed = false;
+  std::atomic<bool> isArmed{false};
   FaultKind kind = FaultKind::kAllocation;
-  std::size_t callsToGo = 0;
+  std::atomic<std::size_t> callsToGo{0};
   int result = 0;
-  bool hasHappened = false;
+  std::atomic<bool> hasHappened{false};
 };
 
 Plan plan;
+std::atomic<bool> isMemoryShort{false};
 
 bool Fails(FaultKind kind) noexcept {
-  if (!plan.isArmed || plan.kind != kind || plan.hasHappened) {
+  if (!plan.isArmed || plan.kind != kind || plan.hasHappened || plan.callsToGo-- != 0) {
     return false;
   }
-  plan.hasHappened = plan.callsToGo == 0;
-  --plan.callsToGo;
-  return plan.hasHappened;
+  plan.hasHappened = true;
+  return true;
 }
 
 void* Allocate(std::size_t size) noexcept {
-  return Fails(FaultKind::kAllocation) ? nullptr : __real_malloc(size);
+  return isMemoryShort || Fails(FaultKind::kAllocation) ? nullptr : __real_malloc(size);
 }
 
 }  // namespace
 
 InjectedFault::InjectedFault(FaultKind kind, std::size_t index, int result) noexcept {
-  plan = {true, kind, index, result, false};
+  plan.kind = kind;
+  plan.callsToGo = index;
+  plan.result = result;
+  plan.hasHappened = false;
+  plan.isArmed = true;
 }
 
 InjectedFault::~InjectedFault() {
@@ -46,6 +51,14 @@ InjectedFault::~InjectedFault() {
 
 bool InjectedFault::HasHappened() const noexcept {
   return plan.hasHappened;
+}
+
+MemoryShortage::MemoryShortage() noexcept {
+  isMemoryShort = true;
+}
+
+MemoryShortage::~MemoryShortage() {
+  isMemoryShort = false;
 }
 
 }  // namespace SsoClient::Testing

@@ -4,8 +4,8 @@
 #include <cstddef>
 
 /// Makes one call of a kind fail: an allocation by operator new or by the library's calls of
-/// malloc, which provide Expat's memory, or an OpenSSL call that digests, verifies or signs. For
-/// one thread at a time.
+/// malloc, which provide Expat's memory, or an OpenSSL call that digests, verifies or signs. One
+/// fault at a time; the call may be on any thread.
 namespace SsoClient::Testing {
 
 enum class FaultKind { kAllocation, kCrypto };
@@ -21,6 +21,15 @@ class InjectedFault {
 
   /// False if there were fewer calls.
   bool HasHappened() const noexcept;
+};
+
+/// During its lifetime every allocation fails, on all threads.
+class MemoryShortage {
+ public:
+  MemoryShortage() noexcept;
+  ~MemoryShortage();
+  MemoryShortage(const MemoryShortage&) = delete;
+  MemoryShortage& operator=(const MemoryShortage&) = delete;
 };
 
 }  // namespace SsoClient::Testing

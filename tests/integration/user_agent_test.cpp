@@ -12,11 +12,8 @@
 
 #include <gmock/gmock.h>
 
-#include <tarnik/core/object_impl.h>
+#include <tarnik/http/connection_specs.h>
 #include <tarnik/http/http_user_agent.h>
-#include <tarnik/ssl/ssl_context.h>
-#include <tarnik/system/tcp_client_socket.h>
-#include <tarnik/system/thread_pool.h>
 
 #include "integration/holder_of_key_fixture.h"
 #include "integration/operation.h"
@@ -27,51 +24,11 @@ namespace {
 
 using testing::SizeIs;
 
-/// Connects to one port of this machine with TLS.
-class LoopbackTls final : public Tarnik::Http::CustomConnectionSpec, public Tarnik::ObjectImpl {
- public:
-  LoopbackTls(Tarnik::Ref<Tarnik::Ssl::SSLContext> context, int port)
-      : context_(std::move(context)), port_(port) {}
-
-  std::string ToString() const override { return "LoopbackTls"; }
-  std::string Host() const override { return kHost; }
-  std::string CookieHost() const override { return kHost; }
-  std::string EndpointKey() const override { return kHost + (":" + std::to_string(port_)); }
-  bool IsProxy() const override { return false; }
-
-  Tarnik::Ref<Tarnik::System::CancellableItem> StartConnect(ConnectCompletion completion) override {
-    const auto socket =
-        Tarnik::System::CreateTCPClientSocket(Tarnik::System::GetThreadPool().get());
-    socket->ConnectAsync(kHost, port_,
-                         [context = context_, completion](
-                             Tarnik::System::TCPClientSocket* connected, Tarnik::Exception* error) {
-                           if (error != nullptr) {
-                             completion(connected, error);
-                             return;
-                           }
-                           const auto stream = context->WrapStream(connected, "");
-                           stream->HandshakeClientAsync(
-                               kHost, "", [stream, completion](Tarnik::Exception* failure) {
-                                 completion(stream.get(), failure);
-                               });
-                         });
-    return Tarnik::System::CreateCancellableItem([socket] {
-      socket->Close();
-      return true;
-    });
-  }
-
- private:
-  static constexpr char kHost[] = "127.0.0.1";
-
-  Tarnik::Ref<Tarnik::Ssl::SSLContext> context_;
-  int port_;
-};
-
 class UserAgentTest : public HolderOfKeyTest {
  protected:
   static std::shared_ptr<SecurityTokenService> ServiceOver(Tarnik::Http::ConnectionPool* pool) {
-    const auto spec = Tarnik::MakeRef<LoopbackTls>(TrustCa(Sts()), Sts().HttpsPort());
+    const auto spec = Tarnik::Http::CreateTLSConnectionSpec("127.0.0.1", Sts().HttpsPort(),
+                                                            TrustCa(Sts()).get(), "");
     SecurityTokenServiceConfigEx config;
     config.url = "/sts";
     config.userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, pool);

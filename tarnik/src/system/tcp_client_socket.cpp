@@ -14,6 +14,7 @@
 #include "system/connect_stage.h"
 #include "system/handler_memory.h"
 #include "system/host_name.h"
+#include "system/peer_failures.h"
 #include "system/tcp_client_socket_impl.h"
 #include "system/tcp_socket.h"
 #include "system/thread_pool_impl.h"
@@ -22,34 +23,6 @@ namespace Tarnik::System {
 namespace {
 
 using boost::system::error_code;
-
-// The failures of one peer, made in advance, so that reporting them needs no memory.
-struct PeerFailures {
-  explicit PeerFailures(const std::string& peer)
-      : closed("The connection to " + peer + " was closed on this side."),
-        noMemory("There is not enough memory for the connection to " + peer + ".") {}
-
-  // `operation` is "Cannot connect to ", for example.
-  IOException Of(const char* operation, const std::string& peer,
-                 const std::string& cause) const noexcept {
-    try {
-      return IOException(operation + peer + ": " + cause);
-    } catch (const std::bad_alloc&) {
-      return noMemory;
-    }
-  }
-  IOException Of(const char* operation, const std::string& peer,
-                 const error_code& cause) const noexcept {
-    try {
-      return Of(operation, peer, cause.message());
-    } catch (const std::bad_alloc&) {
-      return noMemory;
-    }
-  }
-
-  CancelledException closed;
-  IOException noMemory;
-};
 
 HostAddresses NoLookUpThread() noexcept {
   try {

@@ -1,19 +1,27 @@
+#include <future>
 #include <memory>
 #include <string>
 #include <thread>
+#include <utility>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
 #include <tarnik/http/connection_specs.h>
 #include <tarnik/http/http_user_agent.h>
+#include <tarnik/system/tcp_client_socket.h>
+#include <tarnik/system/thread_pool.h>
 
 #include "http/exchange_fixture.h"
 #include "ssl/tls_fixture.h"
 #include "support/loopback.h"
 #include "support/tls_peer.h"
+#include "system/host_lookup.h"
+#include "system/tcp_client_socket_impl.h"
+#include "system/thread_pool_impl.h"
 
 namespace Tarnik::Testing {
 namespace {
@@ -103,6 +111,41 @@ TEST(ConnectionSpecsAsyncTest, ATimeOutSaysThatTheHandshakeIsMissing) {
   EXPECT_THROW(agent->Wait(item.get(), 0), TimeoutException);
   EXPECT_EQ(record->message, "No answer from 127.0.0.1:" + std::to_string(silent.Port()) +
                                  " within 200 milliseconds: waiting for the TLS handshake.");
+}
+
+/// Looks its host up until `answer` is set.
+class SlowLookUpSpec final : public CustomConnectionSpec, public ObjectImpl {
+ public:
+  std::string Host() const override { return "sts.example"; }
+  std::string CookieHost() const override { return Host(); }
+  std::string EndpointKey() const override { return "sts.example:443"; }
+  bool IsProxy() const override { return false; }
+
+  Ref<System::CancellableItem> StartConnect(ConnectCompletion completion) override {
+    System::ConnectRules rules;
+    rules.lookUp = [answered = answer.get_future().share()](const std::string&, int) {
+      answered.wait();
+      return System::HostAddresses{{}, "unknown"};
+    };
+    const auto socket = System::CreateTCPClientSocket(
+        System::ToThreadPoolImpl(System::GetThreadPool().get()), std::move(rules));
+    const auto item = System::CreateConnectItem(socket.get());
+    socket->ConnectAsync(Host(), 443, completion);
+    return item;
+  }
+
+  std::promise<void> answer;
+};
+
+TEST(ConnectionSpecsAsyncTest, ATimeOutSaysThatTheLookUpIsMissing) {
+  const auto spec = MakeRef<SlowLookUpSpec>();
+  const auto agent = CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+  const auto record = std::make_shared<CompletionRecord>();
+  const auto item = agent->SendAsync(PostRequest().get(), RecordIn(record), 5000);
+  EXPECT_THROW(agent->Wait(item.get(), 0), TimeoutException);
+  EXPECT_EQ(record->message,
+            "No answer from sts.example:443 within 5 milliseconds: waiting for the host look-up.");
+  spec->answer.set_value();
 }
 
 TEST(ConnectionSpecsTest, DescribeTheirEndpoint) {

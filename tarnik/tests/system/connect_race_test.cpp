@@ -1,8 +1,10 @@
 #include "system/connect_race.h"
 
-#include <array>
 #include <chrono>
 #include <cstdio>
+#include <cstdlib>
+#include <filesystem>
+#include <functional>
 #include <future>
 #include <memory>
 #include <new>
@@ -20,7 +22,6 @@
 #include <netinet/in.h>
 #include <poll.h>
 #include <sys/socket.h>
-#include <sys/stat.h>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/system/tcp_client_socket.h>
@@ -51,11 +52,11 @@ SocketAddress V4(int port) {
   return address;
 }
 
-/// An address of another family than IPv4; connecting to it fails.
 SocketAddress V6(int port) {
   SocketAddress address{};
   auto* const v6 = reinterpret_cast<sockaddr_in6*>(&address.storage);
   v6->sin6_family = AF_INET6;
+  v6->sin6_addr = in6addr_loopback;
   v6->sin6_port = htons(static_cast<in_port_t>(port));
   address.length = sizeof(sockaddr_in6);
   return address;
@@ -91,6 +92,19 @@ std::vector<int> TcpSockets() {
     }
   }
   return found;
+}
+
+/// "socket:[12345]", for example.
+std::string NameOf(int descriptor) {
+  return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(descriptor)).string();
+}
+
+/// The descriptors of a program that this process starts, with what they are.
+std::string DescriptorsOfAChild() {
+  const std::unique_ptr<FILE, int (*)(FILE*)> output(popen("ls -l /proc/self/fd", "r"), pclose);
+  std::string text(1 << 16, '\0');
+  text.resize(std::fread(text.data(), 1, text.size(), output.get()));
+  return text;
 }
 
 bool HasConnection(const LoopbackListener& listener) {
@@ -148,6 +162,17 @@ TEST(ConnectRaceAsyncTest, AFailureStartsTheNextAttemptAtOnce) {
   const int refusing = RefusingPort(holder);
   const LoopbackListener listener;
   const Connect connect({V4(refusing), Unusable(), V4(refusing), V4(listener.Port())}, 1h);
+  EXPECT_EQ(connect.Result(), "");
+}
+
+TEST(ConnectRaceAsyncTest, TheOtherFamilyIsTriedBeforeTheSecondAddressOfTheFirst) {
+  if (!HasIpv6Loopback()) {
+    GTEST_SKIP() << "this machine has no IPv6";
+  }
+  Descriptor holder;
+  const DeadListener dead;
+  const LoopbackListener listener(true);
+  const Connect connect({V4(RefusingPort(holder)), V4(dead.Port()), V6(listener.Port())}, 1h);
   EXPECT_EQ(connect.Result(), "");
 }
 
@@ -253,9 +278,24 @@ TEST(ConnectRaceAsyncTest, ItsSocketsAreNotInherited) {
   while (TcpSockets().size() < before + 3) {
     std::this_thread::yield();
   }
+  const std::string inherited = DescriptorsOfAChild();
+  EXPECT_THAT(inherited, testing::HasSubstr("/proc/"));
   for (const int descriptor : TcpSockets()) {
     EXPECT_EQ(fcntl(descriptor, F_GETFD) & FD_CLOEXEC, FD_CLOEXEC);
+    EXPECT_THAT(inherited, testing::Not(testing::HasSubstr(NameOf(descriptor))));
   }
+}
+
+TEST(ConnectRaceTest, AnItemHoldsItsSocketOnce) {
+  const auto socket = CreateTCPClientSocket(GetThreadPool().get());
+  {
+    const auto item = CreateConnectItem(socket.get());
+    EXPECT_EQ(socket->RefCount(), 2);
+    EXPECT_TRUE(item->Cancel());
+    EXPECT_TRUE(item->Cancel());
+  }
+  EXPECT_EQ(socket->RefCount(), 1);
+  EXPECT_THROW(CreateConnectItem(nullptr), InvalidArgumentException);
 }
 
 }  // namespace

@@ -1,0 +1,50 @@
+// Acquires a bearer token, but gives up after two seconds.
+#include <chrono>
+#include <iostream>
+#include <string>
+
+#include <ssoclient/ssoclient.h>
+#include <tarnik/http/bounded_user_agent.h>
+#include <tarnik/http/connection_specs.h>
+#include <tarnik/http/http_url.h>
+
+int main(int argc, char** argv) {
+  if (argc != 5) {
+    std::cerr << "usage: limit_a_call HTTPS_URL CA_FILE STS_CERTIFICATE_FILE USER < password\n";
+    return 2;
+  }
+  std::string password;
+  std::getline(std::cin, password);
+  try {
+    Tarnik::Ssl::SSLContextConfig tls;
+    tls.caFiles = {argv[2]};
+    const auto ssl = Tarnik::Ssl::CreateSSLContext(tls);
+    const auto trustedKeys = Tarnik::Xml::Security::CreateTrustedCertificatesResolver(
+        Tarnik::Crypto::LoadCertificates(argv[3]));
+    SsoClient::SecurityTokenServiceConfigEx config;
+    config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
+    bool isHttps = false;
+    int port = 0;
+    std::string host;
+    Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, config.url);
+
+    // Once in the program: the connections of this agent serve all calls.
+    const auto spec = Tarnik::Http::CreateTLSConnectionSpec(host, port, ssl.get(), "");
+    const auto userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+
+    // For each call. `limit->Cancel()` would end it even earlier, on any thread.
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(2);
+    const auto limit = Tarnik::Http::CreateCallLimit(deadline);
+    config.userAgent = Tarnik::Http::CreateBoundedUserAgent(userAgent.get(), limit.get());
+    const auto service = SsoClient::CreateSecurityTokenService(config);
+    SsoClient::TokenSpec request;
+    request.tokenLifetimeSec = 3600;
+    const auto token = service->AcquireToken(argv[4], password, request);
+    std::cout << SsoClient::CreateSamlTokenDescription(*token) << '\n';
+  } catch (const SsoClient::CommunicationException& e) {
+    std::cout << "given up: " << e.what() << '\n';
+  } catch (const std::exception& e) {
+    std::cerr << "No token: " << e.what() << '\n';
+    return 1;
+  }
+}
