@@ -41,6 +41,10 @@ function(ssoclient_add_library name)
   endif()
   ssoclient_link_shared_library(${name} "${LIBRARY_VERSION_SCRIPT}")
   ssoclient_bind_calls(${name} ${prefix}_objects)
+  # The loader finds the other libraries in the folder of this one, also for a program that is not linked to them.
+  if(LIBRARY_REQUIRES)
+    set_target_properties(${name} PROPERTIES INSTALL_RPATH "$ORIGIN")
+  endif()
 
   ssoclient_install_package(NAME ${LIBRARY_PACKAGE} TARGET ${name} HEADERS "${LIBRARY_HEADERS}"
     DESCRIPTION "${LIBRARY_DESCRIPTION}" REQUIRES ${LIBRARY_REQUIRES} DEPENDENCIES ${LIBRARY_DEPENDENCIES})
@@ -70,10 +74,8 @@ function(ssoclient_link_shared_library target version_script)
   # The pool's threads may run or destroy a library's code after the last call into it has returned, so it is never
   # unloaded.
   target_link_options(${target} PRIVATE -Wl,-z,nodelete)
-  # Installed libraries find each other in any folder, also for programs that are not linked to all of them.
   set_target_properties(${target} PROPERTIES
-    VERSION ${PROJECT_VERSION} SOVERSION ${PROJECT_VERSION_MAJOR} LINK_DEPENDS "${version_script}"
-    INSTALL_RPATH "$ORIGIN")
+    VERSION ${PROJECT_VERSION} SOVERSION ${PROJECT_VERSION_MAJOR} LINK_DEPENDS "${version_script}")
 endfunction()
 
 # ssoclient_bind_calls(TARGET OBJECTS): makes the calls of a shared library to its own functions direct, so that no
