@@ -30,9 +30,9 @@ namespace SsoClient {
 ///  - `Tarnik::Xml::Security::XmlSecurityException` when the key fails to sign, and when a token in
 ///    the signed part of the request, or the assertion in the service's answer, is in the scope of
 ///    a namespace declaration with a relative URI (Canonical XML 1.0, section 1.3);
-///  - `CommunicationException` when the exchange fails or takes longer than 240 seconds. The
-///    exceptions of connections, TLS and HTTP (`Tarnik::IOException` and the classes derived from
-///    it) leave an operation only as this class;
+///  - `CommunicationException` when the exchange fails or takes longer than 240 seconds, and when
+///    the process is ending. The exceptions of connections, TLS and HTTP (`Tarnik::IOException` and
+///    the classes derived from it) leave an operation only as this class;
 ///  - `InvalidCredentialsException` and `PasswordExpiredException` when the service refuses the
 ///    login;
 ///  - `ParseException` when the code of a SOAP fault has a prefix that is not declared;
@@ -41,7 +41,9 @@ namespace SsoClient {
 ///    `ParseException`, `InvalidSignatureException`, `Tarnik::Xml::XMLParseException`,
 ///    `Tarnik::Base64FormatException`, `Tarnik::Crypto::CryptoException` and the exceptions of its
 ///    resolver, as `CreateSamlToken` does;
-///  - `std::bad_alloc`.
+///  - `Tarnik::ResourceException` when the system cannot start a thread that the operation needs;
+///  - `std::bad_alloc` when memory runs out. The callback of an asynchronous operation receives a
+///    `Tarnik::ResourceException` instead.
 ///
 /// A returned token is null only if the service answers with an empty token text.
 ///

@@ -69,12 +69,12 @@ TEST_F(RefusalTest, FaultCodeWithoutPrefixIsUnexpected) {
 // A SOAP 1.1 answer with this attribute on its Envelope.
 DevSts::Misbehavior AnswerWith(int status, const std::string& attribute, const std::string& body) {
   DevSts::Misbehavior misbehavior;
-  misbehavior.httpAnswer = DevSts::HttpAnswer{
-      status,
-      status == 200 ? "OK" : "Internal Server Error",
-      {},
-      R"(<S:Envelope xmlns:S="http://schemas.xmlsoap.org/soap/envelope/" )" + attribute +
-          "><S:Body>" + body + "</S:Body></S:Envelope>"};
+  misbehavior.httpAnswer =
+      DevSts::HttpAnswer{status,
+                         status == 200 ? "OK" : "Internal Server Error",
+                         {},
+                         R"(<S:Envelope xmlns:S="http://schemas.xmlsoap.org/soap/envelope/" )" +
+                             attribute + "><S:Body>" + body + "</S:Body></S:Envelope>"};
   return misbehavior;
 }
 
