@@ -88,8 +88,8 @@ void LogRegistry::SetSink(LogSink sink) {
   if (replaced == nullptr) {
     return;
   }
-  // Threads cannot wait for each other here: each waits for calls of a sink that was set after the
-  // sinks that it is inside of, or is one of them.
+  // A sink may call this function, but threads cannot wait for each other: a thread waits for the
+  // calls of the latest sink, and whoever waits for that thread replaced an earlier one.
   const std::size_t own = SinkCall::CountOnThisThread(*replaced);
   replaced->hasFewerCalls.wait(guard, [&] { return replaced->calls == own; });
   guard.unlock();
