@@ -2,7 +2,7 @@ include("${CMAKE_CURRENT_LIST_DIR}/SsoClientInstall.cmake")
 include("${CMAKE_CURRENT_LIST_DIR}/SsoClientTarget.cmake")
 
 # ssoclient_add_library(NAME PACKAGE ... SOURCES ... INCLUDES ... HEADERS ... VERSION_SCRIPT ... DESCRIPTION ...
-#                       [GENERATED ...] [DEFINITIONS ...] [LINK_OPTIONS ...]
+#                       [GENERATED ...] [DEFINITIONS ...]
 #                       [PUBLIC_LIBRARIES ...] [PRIVATE_LIBRARIES ...] [REQUIRES ...] [DEPENDENCIES ...])
 # adds libNAME.so, which is installed as PACKAGE and linked as PACKAGE::NAME, from every source below the folder SOURCES:
 #   NAME          the shared library, which exports what VERSION_SCRIPT lists
@@ -15,7 +15,7 @@ include("${CMAKE_CURRENT_LIST_DIR}/SsoClientTarget.cmake")
 function(ssoclient_add_library name)
   cmake_parse_arguments(PARSE_ARGV 1 LIBRARY "SEPARATE_FOR_TESTS"
     "PACKAGE;SOURCES;INCLUDES;HEADERS;VERSION_SCRIPT;DESCRIPTION;GENERATED"
-    "DEFINITIONS;LINK_OPTIONS;PUBLIC_LIBRARIES;PRIVATE_LIBRARIES;REQUIRES;DEPENDENCIES")
+    "DEFINITIONS;PUBLIC_LIBRARIES;PRIVATE_LIBRARIES;REQUIRES;DEPENDENCIES")
   string(REPLACE "-" "_" prefix "${name}")
   file(GLOB_RECURSE sources CONFIGURE_DEPENDS "${LIBRARY_SOURCES}/*.cpp")
 
@@ -39,8 +39,12 @@ function(ssoclient_add_library name)
   if(NOT LIBRARY_SEPARATE_FOR_TESTS OR NOT SSOCLIENT_BUILD_TESTS)
     ssoclient_merge_folders(${prefix}_objects "${LIBRARY_SOURCES}")
   endif()
-  ssoclient_link_shared_library(${name} "${LIBRARY_VERSION_SCRIPT}" ${LIBRARY_LINK_OPTIONS})
+  ssoclient_link_shared_library(${name} "${LIBRARY_VERSION_SCRIPT}")
   ssoclient_bind_calls(${name} ${prefix}_objects)
+  # The loader finds the other libraries in the folder of this one, also for a program that is not linked to them.
+  if(LIBRARY_REQUIRES)
+    set_target_properties(${name} PROPERTIES INSTALL_RPATH "$ORIGIN")
+  endif()
 
   ssoclient_install_package(NAME ${LIBRARY_PACKAGE} TARGET ${name} HEADERS "${LIBRARY_HEADERS}"
     DESCRIPTION "${LIBRARY_DESCRIPTION}" REQUIRES ${LIBRARY_REQUIRES} DEPENDENCIES ${LIBRARY_DEPENDENCIES})
@@ -60,14 +64,16 @@ function(ssoclient_merge_folders objects folder)
   endforeach()
 endfunction()
 
-# ssoclient_link_shared_library(TARGET VERSION_SCRIPT [OPTION...]): sets the options and the version that the library is
-# linked with.
+# ssoclient_link_shared_library(TARGET VERSION_SCRIPT): sets the options and the version that the library is linked with.
 function(ssoclient_link_shared_library target version_script)
-  target_link_options(${target} PRIVATE ${ARGN} "-Wl,--version-script=${version_script}")
+  target_link_options(${target} PRIVATE "-Wl,--version-script=${version_script}")
   # A sanitizer's functions are resolved by the program.
   if(NOT SSOCLIENT_SANITIZER AND NOT SSOCLIENT_BUILD_FUZZERS)
     target_link_options(${target} PRIVATE -Wl,--no-undefined)
   endif()
+  # The pool's threads may run or destroy a library's code after the last call into it has returned, so it is never
+  # unloaded.
+  target_link_options(${target} PRIVATE -Wl,-z,nodelete)
   set_target_properties(${target} PROPERTIES
     VERSION ${PROJECT_VERSION} SOVERSION ${PROJECT_VERSION_MAJOR} LINK_DEPENDS "${version_script}")
 endfunction()

@@ -2,6 +2,7 @@
 # of a project that contains it.
 include("${CMAKE_CURRENT_LIST_DIR}/SsoClientWarnings.cmake")
 include("${CMAKE_CURRENT_LIST_DIR}/SsoClientSanitizers.cmake")
+include("${CMAKE_CURRENT_LIST_DIR}/SsoClientHardening.cmake")
 
 function(ssoclient_configure_target)
   foreach(target IN LISTS ARGN)
@@ -19,4 +20,5 @@ function(ssoclient_configure_target)
   endforeach()
   ssoclient_target_warnings(${ARGN})
   ssoclient_target_sanitizers(${ARGN})
+  ssoclient_target_hardening(${ARGN})
 endfunction()

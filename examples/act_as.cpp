@@ -3,6 +3,7 @@
 #include <fstream>
 #include <iostream>
 #include <iterator>
+#include <stdexcept>
 #include <string>
 
 #include <ssoclient/ssoclient.h>
@@ -30,6 +31,9 @@ int main(int argc, char** argv) {
 
     std::ifstream file(argv[6]);
     const std::string text(std::istreambuf_iterator<char>(file), {});
+    if (text.empty()) {
+      throw std::runtime_error(std::string("cannot read ") + argv[6]);
+    }
     SsoClient::TokenSpec spec;
     spec.tokenLifetimeSec = 3600;
     const auto ownToken = service->AcquireTokenByCertificate(spec);

@@ -1,22 +1,19 @@
-// The receiving side: decides whether to accept a token that a peer presents. PEER_CERTIFICATE is
-// the certificate with which the peer proved its identity, for example in a TLS handshake.
+// The receiving side: decides whether to accept a token from a peer that has proved its identity
+// with PEER_CERTIFICATE, for example in a TLS handshake. Ends with status 1 if it does not.
 #include <cstring>
 #include <fstream>
 #include <iostream>
 #include <iterator>
 #include <set>
+#include <stdexcept>
 #include <string>
 
 #include <ssoclient/ssoclient.h>
 
-namespace {
-
-bool IsSame(const Tarnik::Crypto::Certificate& left, const Tarnik::Crypto::Certificate& right) {
-  return left.DerLength() == right.DerLength() &&
-         std::memcmp(left.DerBytes(), right.DerBytes(), left.DerLength()) == 0;
+static bool IsSame(const Tarnik::Crypto::Certificate& a, const Tarnik::Crypto::Certificate& b) {
+  return a.DerLength() == b.DerLength() &&
+         std::memcmp(a.DerBytes(), b.DerBytes(), a.DerLength()) == 0;
 }
-
-}  // namespace
 
 int main(int argc, char** argv) {
   if (argc != 5) {
@@ -28,6 +25,9 @@ int main(int argc, char** argv) {
         Tarnik::Crypto::LoadCertificates(argv[1]));
     std::ifstream file(argv[2]);
     const std::string text(std::istreambuf_iterator<char>(file), {});
+    if (text.empty()) {
+      throw std::runtime_error(std::string("cannot read ") + argv[2]);
+    }
     const auto peer = Tarnik::Crypto::LoadCertificates(argv[3]).front();
 
     const auto token = SsoClient::CreateSamlToken(text, trustedKeys.get());
@@ -36,13 +36,14 @@ int main(int argc, char** argv) {
     const auto holder = token->HolderOfKeyCertificate();
     if (!audiences.empty() && audiences.count(argv[4]) == 0) {
       std::cout << "refused: the token is for other audiences\n";
-    } else if (holder != nullptr && !IsSame(*holder, *peer)) {
-      std::cout << "refused: the token is bound to another key\n";
+    } else if (holder == nullptr || !IsSame(*holder, *peer)) {
+      std::cout << "refused: the token is not bound to the peer's key\n";
     } else {
       std::cout << "accepted: " << token->Subject().name << '@' << token->Subject().domain << '\n';
+      return 0;
     }
   } catch (const std::exception& e) {
     std::cout << "refused: " << e.what() << '\n';
   }
-  return 0;
+  return 1;
 }

@@ -1,9 +1,19 @@
-// Sends the library's log lines, including the steps of each operation, to the server's own log.
+// Sends the library's log lines, including the steps of each operation, to the server's own log:
+// to standard output, with the priority that the systemd journal reads at the start of a line.
 #include <iostream>
 #include <string>
 
+#include <syslog.h>
+
 #include <ssoclient/ssoclient.h>
 #include <tarnik/service/log.h>
+
+// The priority of a line for syslog, whose scale ends earlier and is finer at its start.
+static int SyslogPriority(int level) {
+  constexpr int kPriorities[] = {LOG_CRIT,   LOG_CRIT, LOG_ERR,   LOG_ERR,   LOG_WARNING,
+                                 LOG_NOTICE, LOG_INFO, LOG_DEBUG, LOG_DEBUG, LOG_DEBUG};
+  return kPriorities[level];
+}
 
 int main(int argc, char** argv) {
   if (argc != 5) {
@@ -15,7 +25,7 @@ int main(int argc, char** argv) {
   // First, so that no line goes to the default sink.
   Tarnik::Service::SetLogLevel("SsoClient", 7);
   Tarnik::Service::SetLogSink([](const Tarnik::Service::LogRecord& line) {
-    std::cout << '[' << line.level << "] " << line.text << '\n';
+    std::cout << '<' << SyslogPriority(line.level) << '>' << line.text << '\n';
   });
   try {
     Tarnik::Ssl::SSLContextConfig tls;

@@ -2,6 +2,7 @@
 #include <fstream>
 #include <iostream>
 #include <iterator>
+#include <stdexcept>
 #include <string>
 
 #include <ssoclient/ssoclient.h>
@@ -29,6 +30,9 @@ int main(int argc, char** argv) {
 
     std::ifstream file(argv[6]);
     const std::string text(std::istreambuf_iterator<char>(file), {});
+    if (text.empty()) {
+      throw std::runtime_error(std::string("cannot read ") + argv[6]);
+    }
     const auto token = SsoClient::CreateSamlToken(text, trustedKeys.get());
     const auto renewed = service->RenewToken(*token, 2 * 3600);
     std::cout << SsoClient::CreateSamlTokenDescription(*renewed) << '\n';

@@ -1,7 +1,8 @@
-// Asks the service whether a token is still valid.
+// Asks the service whether a token is still valid. Ends with status 1 if it is not.
 #include <fstream>
 #include <iostream>
 #include <iterator>
+#include <stdexcept>
 #include <string>
 
 #include <ssoclient/ssoclient.h>
@@ -26,11 +27,14 @@ int main(int argc, char** argv) {
 
     std::ifstream file(argv[4]);
     const std::string text(std::istreambuf_iterator<char>(file), {});
+    if (text.empty()) {
+      throw std::runtime_error(std::string("cannot read ") + argv[4]);
+    }
     const auto token = SsoClient::CreateSamlToken(text, trustedKeys.get());
     const bool isValid = service->ValidateSubject(*token);
     std::cout << (isValid ? "valid: " : "INVALID: ")
               << SsoClient::CreateSamlTokenDescription(*token) << '\n';
-    return 0;
+    return isValid ? 0 : 1;
   } catch (const std::exception& e) {
     std::cerr << "Not validated: " << e.what() << '\n';
     return 1;

@@ -27,8 +27,9 @@ class GssNegotiationContext {
   /// Sends `inputLeg` and waits for the answer, at most 40 seconds. When the answer has an empty
   /// negotiation id, the next call starts a new negotiation.
   ///
-  /// Throws as `SecurityTokenService::AcquireToken` does. The state is then unchanged, except that
-  /// the negotiation id of an answer that could be read is kept.
+  /// Throws what `SecurityTokenService::AcquireToken` throws, with the configuration's resolver in
+  /// the place of the token factory. The state is then unchanged, except that the negotiation id of
+  /// an answer that could be read is kept.
   virtual GssNegotiationResult Negotiate(const std::vector<unsigned char>& inputLeg) = 0;
 
  protected:

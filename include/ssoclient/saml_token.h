@@ -89,8 +89,8 @@ using KeyInfoResolverSource =
 ///
 /// `clockToleranceSec`, in seconds, widens the validity period at both ends; a negative value
 /// narrows it. The default is 600. A null `resolver`, or a form without one, means that the
-/// signature is NOT verified: only its form is checked, and that it covers the token. `resolver` is
-/// used only during the call.
+/// signature is NOT verified: only its form is checked, and that it covers the token. Anyone can
+/// have written such a token. `resolver` is used only during the call.
 ///
 /// Throws
 ///  - `Tarnik::Xml::XMLParseException` for text that is not well-formed XML, or that the parser
@@ -100,7 +100,8 @@ using KeyInfoResolverSource =
 ///    `Tarnik::Xml::Security::XmlSecurityException`;
 ///  - `Tarnik::Base64FormatException` or `Tarnik::Crypto::CryptoException` for a holder-of-key
 ///    certificate that cannot be decoded;
-///  - any other exception of `resolver`.
+///  - any other exception of `resolver`;
+///  - `std::bad_alloc`.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml);
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml,
                                                                   long clockToleranceSec);

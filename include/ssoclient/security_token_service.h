@@ -28,15 +28,22 @@ namespace SsoClient {
 ///  - `Tarnik::InvalidStateException`, before anything is sent, when the operation needs a
 ///    `HolderOfKeyConfig` and there is none, or its certificate is not valid now;
 ///  - `Tarnik::Xml::Security::XmlSecurityException` when the key fails to sign, and when a token in
-///    the signed part of the request, or the issued token, is in the scope of a namespace
-///    declaration with a relative URI (Canonical XML 1.0, section 1.3);
-///  - `CommunicationException` when the exchange fails or takes longer than 240 seconds;
+///    the signed part of the request, or the assertion in the service's answer, is in the scope of
+///    a namespace declaration with a relative URI (Canonical XML 1.0, section 1.3);
+///  - `CommunicationException` when the exchange fails or takes longer than 240 seconds, and when
+///    the process is ending. The exceptions of connections, TLS and HTTP (`Tarnik::IOException` and
+///    the classes derived from it) leave an operation only as this class;
 ///  - `InvalidCredentialsException` and `PasswordExpiredException` when the service refuses the
 ///    login;
+///  - `ParseException` when the code of a SOAP fault has a prefix that is not declared;
 ///  - `SsoException` for any other fault, and for an answer of an unexpected form;
-///  - `InvalidTokenException` (`ParseException`, `InvalidSignatureException`) or another
-///    `Tarnik::Exception` (such as `Tarnik::Xml::XMLParseException`) when the token factory rejects
-///    the issued token.
+///  - what the token factory throws when it rejects the issued token: the library's own throws
+///    `ParseException`, `InvalidSignatureException`, `Tarnik::Xml::XMLParseException`,
+///    `Tarnik::Base64FormatException`, `Tarnik::Crypto::CryptoException` and the exceptions of its
+///    resolver, as `CreateSamlToken` does;
+///  - `Tarnik::ResourceException` when the system cannot start a thread that the operation needs;
+///  - `std::bad_alloc` when memory runs out. The callback of an asynchronous operation receives a
+///    `Tarnik::ResourceException` instead.
 ///
 /// A returned token is null only if the service answers with an empty token text.
 ///
@@ -119,7 +126,9 @@ SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenServic
     const SecurityTokenServiceConfig& config);
 /// Creates a service that sends through the caller's user agent. Throws
 /// `Tarnik::InvalidArgumentException` when the user agent or the token factory is null, and for a
-/// holder-of-key configuration as above. The operations reject a malformed request target.
+/// holder-of-key configuration as above. The operations throw this class for a malformed request
+/// target, and whatever the user agent's `SendAsync` throws. A `Tarnik::Exception` that its `Wait`
+/// throws becomes a `CommunicationException`.
 SSOCLIENT_EXPORT std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(
     const SecurityTokenServiceConfigEx& config);
 

@@ -1,7 +1,7 @@
 #ifndef SSOCLIENT_SSOCLIENT_H
 #define SSOCLIENT_SSOCLIENT_H
 
-// Includes the whole public interface.
+// Includes the whole public interface, with the exceptions of the platform that leave it.
 
 #include <ssoclient/advice.h>
 #include <ssoclient/confirmation_type.h>
@@ -18,6 +18,8 @@
 #include <ssoclient/token_spec.h>
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/http/http_exception.h>
+#include <tarnik/ssl/ssl_exception.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 #include <tarnik/xml/xml_parse_exception.h>
 

@@ -66,6 +66,40 @@ TEST_F(RefusalTest, FaultCodeWithoutPrefixIsUnexpected) {
             "Unexpected SOAP fault: FailedAuthentication; request failed.");
 }
 
+// A SOAP 1.1 answer with this attribute on its Envelope.
+DevSts::Misbehavior AnswerWith(int status, const std::string& attribute, const std::string& body) {
+  DevSts::Misbehavior misbehavior;
+  misbehavior.httpAnswer =
+      DevSts::HttpAnswer{status,
+                         status == 200 ? "OK" : "Internal Server Error",
+                         {},
+                         R"(<S:Envelope xmlns:S="http://schemas.xmlsoap.org/soap/envelope/" )" +
+                             attribute + "><S:Body>" + body + "</S:Body></S:Envelope>"};
+  return misbehavior;
+}
+
+TEST_F(RefusalTest, FaultCodeWithUndeclaredPrefixIsAParseException) {
+  const std::string fault = "<S:Fault><faultcode>no:Such</faultcode></S:Fault>";
+  Sts().SetMisbehavior(AnswerWith(500, "", fault));
+  EXPECT_THAT(MessageOf<ParseException>([] { Acquire(); }),
+              HasSubstr("uses undefined prefix: `no'"));
+  Sts().SetMisbehavior(AnswerWith(500, R"(xmlns:no="urn:no")", fault));
+  EXPECT_EQ(MessageOf<SsoException>([] { Acquire(); }),
+            "Unexpected SOAP fault: no:Such; request failed.");
+}
+
+TEST_F(RefusalTest, AssertionInScopeOfARelativeNamespaceIsAnXmlSecurityException) {
+  const std::string body =
+      "<RequestSecurityTokenResponseCollection><RequestSecurityTokenResponse>"
+      "<RequestedSecurityToken><Assertion/></RequestedSecurityToken>"
+      "</RequestSecurityTokenResponse></RequestSecurityTokenResponseCollection>";
+  Sts().SetMisbehavior(AnswerWith(200, R"(xmlns:r="relative")", body));
+  EXPECT_THAT(MessageOf<Tarnik::Xml::Security::XmlSecurityException>([] { Acquire(); }),
+              HasSubstr("relative"));
+  Sts().SetMisbehavior(AnswerWith(200, R"(xmlns:r="urn:absolute")", body));
+  MessageOf<ParseException>([] { Acquire(); });  // the assertion is empty
+}
+
 TEST_F(RefusalTest, FaultIsReadWithAnySuccessStatus) {
   DevSts::Misbehavior misbehavior;
   misbehavior.fault = DevSts::FaultAnswer{kTrust, "FailedAuthentication", "no", false, 200};

@@ -1,3 +1,7 @@
+#include <atomic>
+#include <deque>
+#include <future>
+#include <memory>
 #include <mutex>
 #include <stdexcept>
 #include <string>
@@ -97,6 +101,111 @@ TEST_F(LogTest, ConcurrentLinesAllArrive) {
     thread.join();
   }
   EXPECT_EQ(lines_.size(), 1000U);
+}
+
+TEST_F(LogTest, ReplacedSinkHasEndedOnAllThreads) {
+  const StaticLogger logger("LogTest.Replaced");
+  std::promise<void> entered;
+  std::promise<void> mayLeave;
+  std::atomic<bool> isInSink{false};
+  auto owned = std::make_shared<int>();
+  const std::weak_ptr<int> ownedBySink = owned;
+  SetLogSink([&, owned = std::move(owned)](const LogRecord&) {
+    isInSink = true;
+    entered.set_value();
+    mayLeave.get_future().wait();
+    isInSink = false;
+  });
+  std::thread writer([&] { LogInternal(logger, 1, "line", {}); });
+  entered.get_future().wait();
+
+  std::atomic<int> newLines{0};
+  bool hasEnded = false;
+  std::thread replacer([&] {
+    SetLogSink([&](const LogRecord&) { ++newLines; });
+    hasEnded = !isInSink && ownedBySink.expired();
+  });
+  // New lines do not wait for the replaced sink. The replacing thread has time to return too early.
+  while (newLines < 1000) {
+    LogInternal(logger, 1, "line", {});
+    std::this_thread::yield();
+  }
+  mayLeave.set_value();
+  replacer.join();
+  writer.join();
+  EXPECT_TRUE(hasEnded);
+}
+
+TEST_F(LogTest, ConcurrentLinesReachNoReplacedSink) {
+  const StaticLogger logger("LogTest.Replacing");
+  std::atomic<bool> isDone{false};
+  std::atomic<int> linesTooLate{0};
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 3; ++t) {
+    threads.emplace_back([&] {
+      while (!isDone) {
+        LogInternal(logger, 1, "line", {});
+      }
+    });
+  }
+  std::deque<std::atomic<bool>> isCurrent;  // outlives the lines that come too late
+  for (int i = 0; i < 60; ++i) {
+    auto& isThisCurrent = isCurrent.emplace_back(true);
+    SetLogSink([&](const LogRecord&) {
+      std::this_thread::yield();
+      linesTooLate += isThisCurrent ? 0 : 1;
+    });
+    std::this_thread::yield();
+    SetLogSink([](const LogRecord&) {});
+    isThisCurrent = false;
+  }
+  isDone = true;
+  for (auto& thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(linesTooLate, 0);
+}
+
+TEST_F(LogTest, SinkMayReplaceItselfAndIsDestroyedAfterItsCall) {
+  const StaticLogger logger("LogTest.Self");
+  auto owned = std::make_shared<std::string>("still there");
+  const std::weak_ptr<std::string> ownedBySink = owned;
+  std::string seen;
+  SetLogSink([&, owned = std::move(owned)](const LogRecord& record) {
+    if (record.text == "outer") {
+      LogInternal(logger, 1, "inner", {});
+      seen += ", " + *owned;
+      return;
+    }
+    SetLogSink([this](const LogRecord&) { lines_.emplace_back(); });
+    LogInternal(logger, 1, "to the new sink", {});
+    seen = *owned;
+  });
+  LogInternal(logger, 1, "outer", {});
+  EXPECT_EQ(seen, "still there, still there");
+  EXPECT_EQ(lines_.size(), 1U);
+  EXPECT_TRUE(ownedBySink.expired());
+}
+
+TEST_F(LogTest, SinksMayReplaceThemselvesOnSeveralThreadsAtOnce) {
+  const StaticLogger logger("LogTest.SelfThreads");
+  constexpr int kThreads = 4;
+  std::atomic<int> inside{0};
+  SetLogSink([&](const LogRecord&) {
+    ++inside;
+    while (inside < kThreads) {
+      std::this_thread::yield();
+    }
+    SetLogSink({});
+  });
+  std::vector<std::thread> threads;
+  for (int t = 0; t < kThreads; ++t) {
+    threads.emplace_back([&logger] { LogInternal(logger, 1, "line", {}); });
+  }
+  for (auto& thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(inside, kThreads);
 }
 
 }  // namespace

@@ -58,6 +58,11 @@ using LogSink = std::function<void(const LogRecord&)>;
 
 /// Sends all lines to `sink` from now on; an empty sink restores the default, which writes time,
 /// level, logger and text to the standard error stream.
+///
+/// When this function returns, the previous sink runs on no thread and is destroyed: it waits for
+/// the calls that are under way. The caller must therefore not hold a lock that the previous sink
+/// needs to return. A sink may call this function itself. Its own call then does not count: the
+/// function waits only for other threads, and the sink is destroyed after it has returned.
 TARNIK_EXPORT void SetLogSink(LogSink sink);
 
 }  // namespace Tarnik::Service

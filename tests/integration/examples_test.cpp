@@ -1,0 +1,102 @@
+// The examples that read a token from a file.
+#include <array>
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <string>
+
+#include <gmock/gmock.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include "integration/sts_fixture.h"
+
+namespace SsoClient::Testing {
+namespace {
+
+using testing::HasSubstr;
+using testing::StartsWith;
+
+/// A folder that is removed with its files.
+class TemporaryFolder {
+ public:
+  TemporaryFolder() {
+    char name[] = "/tmp/ssoclient-test-XXXXXX";
+    path_ = mkdtemp(name);
+  }
+  ~TemporaryFolder() {
+    for (const auto& file : files_) {
+      unlink(file.c_str());
+    }
+    rmdir(path_.c_str());
+  }
+  TemporaryFolder(const TemporaryFolder&) = delete;
+  TemporaryFolder& operator=(const TemporaryFolder&) = delete;
+
+  std::string Write(const std::string& name, const std::string& content) {
+    files_.push_back(path_ + "/" + name);
+    std::ofstream(files_.back()) << content;
+    return files_.back();
+  }
+
+ private:
+  std::string path_;
+  std::vector<std::string> files_;
+};
+
+struct Outcome {
+  int status;
+  std::string output;  // of both streams
+};
+
+Outcome RunExample(const std::string& command) {
+  Outcome run{-1, {}};
+  FILE* pipe = popen((EXAMPLES_FOLDER "/" + command + " 2>&1").c_str(), "r");
+  std::array<char, 4096> buffer;
+  while (fgets(buffer.data(), buffer.size(), pipe) != nullptr) {
+    run.output += buffer.data();
+  }
+  const int status = pclose(pipe);
+  run.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  return run;
+}
+
+class ExamplesTest : public StsTest {
+ protected:
+  TemporaryFolder folder_;
+  std::string ca_ = folder_.Write("ca.pem", Sts().CaCertificatePem());
+  std::string signing_ = folder_.Write("signing.pem", Sts().SigningCertificatePem());
+};
+
+TEST_F(ExamplesTest, CheckTokenRefusesBearerTokensOfPeersWithACertificate) {
+  const auto bearer = Service()->AcquireToken(kUser, kPassword, TenMinutes());
+  const auto file = folder_.Write("token.xml", bearer->Xml());
+  const Outcome run = RunExample("check_token " + signing_ + " " + file + " " + signing_ + " here");
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.output, "refused: the token is not bound to the peer's key\n");
+  // The token itself is good.
+  EXPECT_EQ(
+      RunExample("check_token_by_issuer " + file + " " + bearer->Issuer() + " " + signing_).status,
+      0);
+}
+
+TEST_F(ExamplesTest, TokenFilesThatCannotBeReadAreFailures) {
+  const std::string missing = "/nonexistent/token.xml";
+  const std::string service = Sts().HttpsUrl() + " " + ca_ + " " + signing_ + " ";
+  const std::string check = "check_token " + signing_ + " ";
+  for (const std::string& command : {
+           check + missing + " " + signing_ + " here",
+           "check_token_by_issuer " + missing + " issuer " + signing_,
+           "validate_token " + service + missing,
+       }) {
+    const Outcome run = RunExample(command);
+    EXPECT_GT(run.status, 0) << command;
+    EXPECT_THAT(run.output, HasSubstr("cannot read " + missing)) << command;
+  }
+  const Outcome folder = RunExample(check + "/tmp " + signing_ + " here");
+  EXPECT_EQ(folder.status, 1);
+  EXPECT_THAT(folder.output, StartsWith("refused: "));
+}
+
+}  // namespace
+}  // namespace SsoClient::Testing
