@@ -48,6 +48,9 @@ struct SSLContextConfig {
   bool useSystemStore = false;
   /// PEM files of certificate revocation lists. If there is any, every certificate of a peer's
   /// chain is checked, and a certificate whose issuer's list is missing or out of date is rejected.
+  /// Of several lists of an issuer the newest by thisUpdate counts, since a newer list replaces the
+  /// older ones (RFC 5280, section 5): a certificate that was only on hold may be missing from it.
+  /// When several lists have that same date, a revocation in any of them counts.
   std::vector<std::string> crlFiles;
   /// If not empty, the peer's certificate must also equal one of these byte for byte.
   std::vector<Ref<const Crypto::Certificate>> pinnedCertificates;
