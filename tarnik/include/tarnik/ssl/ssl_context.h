@@ -27,7 +27,9 @@ class TARNIK_EXPORT SSLStream : public System::Stream {
                                     HandshakeCompletion completion) = 0;
 };
 
-/// Trust and sessions shared by TLS connections. Immutable; thread-safe. Supports TLS 1.2 and 1.3.
+/// Trust and sessions shared by TLS connections. Immutable; thread-safe. Supports TLS 1.3 and, with
+/// ECDHE and AES-GCM or ChaCha20-Poly1305, TLS 1.2 (RFC 9325); neither OpenSSL's configuration file
+/// nor the environment changes what is offered.
 /// Sessions are resumed only with the same host, on any port, and the same server name.
 class TARNIK_EXPORT SSLContext : public virtual Object {
  public:
