@@ -10,8 +10,8 @@ namespace SsoClient {
 /// The key that a service proves possession of, so that tokens can be bound to it. Neither field
 /// may be null.
 struct HolderOfKeyConfig {
-  /// The client's certificate, which is sent in requests. Signing is refused outside its period of
-  /// validity, with a tolerance of 600 seconds.
+  /// The client's certificate. A request that carries it is refused outside its period of validity,
+  /// with a tolerance of 600 seconds; `AcquireTokenByToken` carries only the token.
   Tarnik::Ref<const Tarnik::Crypto::Certificate> certificate;
   /// The certificate's private key: RSA of at least 2048 bits. Used only to sign.
   Tarnik::Ref<const Tarnik::Crypto::PrivateKey> privateKey;

@@ -12,7 +12,7 @@ extern const Tarnik::Service::StaticLogger kLogger;
 
 /// The level of the lines that trace operations and requests.
 inline constexpr int kTraceLevel = 7;
-/// The level of the lines that warn about a mistake of the caller.
+/// The level of the lines that warn about a mistake of the caller or explain a refusal.
 inline constexpr int kWarningLevel = 4;
 /// The level of the lines that report a success.
 inline constexpr int kSuccessLevel = 5;

@@ -58,9 +58,9 @@ Builder SignByCertificate(const HolderOfKeyConfig& config, const Builder& header
   return MakeSignedSoapBuilderForCertificate(header, body, config.privateKey, *config.certificate);
 }
 
+// The request carries the token and not the certificate, whose period does not matter then.
 Builder SignByToken(const HolderOfKeyConfig& config, const Builder& header, const Builder& body,
                     const SamlToken& token) {
-  CheckPeriodOfValidity(*config.certificate, Tarnik::System::GetUtcDateTime());
   return MakeSignedSoapBuilderForToken(header, body, config.privateKey, token.Id());
 }
 

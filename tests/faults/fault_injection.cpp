@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <new>
 
+#include <openssl/crypto.h>
 #include <openssl/evp.h>
 
 extern "C" void* __real_malloc(std::size_t size);
@@ -33,6 +34,31 @@ bool Fails(FaultKind kind) noexcept {
 
 void* Allocate(std::size_t size) noexcept {
   return isMemoryShort || Fails(FaultKind::kAllocation) ? nullptr : __real_malloc(size);
+}
+
+void* AllocateInOpenSsl(std::size_t size, const char* /*file*/, int /*line*/) noexcept {
+  return size == 0 || Fails(FaultKind::kOpenSslAllocation) ? nullptr : __real_malloc(size);
+}
+
+void* ReallocateInOpenSsl(void* memory, std::size_t size, const char* /*file*/,
+                          int /*line*/) noexcept {
+  if (size == 0) {
+    std::free(memory);
+    return nullptr;
+  }
+  return Fails(FaultKind::kOpenSslAllocation) ? nullptr : std::realloc(memory, size);
+}
+
+void FreeInOpenSsl(void* memory, const char* /*file*/, int /*line*/) noexcept {
+  std::free(memory);
+}
+
+// OpenSSL accepts other functions only before its first allocation, which is made when the library
+// under test is initialised.
+[[gnu::constructor(101)]] void ReplaceOpenSslMemory() {
+  if (CRYPTO_set_mem_functions(AllocateInOpenSsl, ReallocateInOpenSsl, FreeInOpenSsl) != 1) {
+    std::abort();
+  }
 }
 
 }  // namespace

@@ -4,11 +4,12 @@
 #include <cstddef>
 
 /// Makes one call of a kind fail: an allocation by operator new or by the library's calls of
-/// malloc, which provide Expat's memory, or an OpenSSL call that digests, verifies or signs. One
-/// fault at a time; the call may be on any thread.
+/// malloc, which provide Expat's memory, an allocation within OpenSSL, or an OpenSSL call that
+/// digests, verifies or signs. One fault at a time; the
+/// call may be on any thread.
 namespace SsoClient::Testing {
 
-enum class FaultKind { kAllocation, kCrypto };
+enum class FaultKind { kAllocation, kOpenSslAllocation, kCrypto };
 
 /// During its lifetime the call of `kind` with this index (counted from 0) fails; a crypto call
 /// returns `result`.

@@ -254,7 +254,7 @@ TEST_F(HolderOfKeyAsyncTest, InvalidStateReachesTheCallback) {
   arguments.token = AcquireBound();
   Sts().ClearRequests();
   for (const Operation operation :
-       {Operation::Password, Operation::Certificate, Operation::Token, Operation::Renew}) {
+       {Operation::Password, Operation::Certificate, Operation::Renew}) {
     const Outcome outcome = AwaitCall(operation, *expired, arguments);
     EXPECT_EQ(outcome.errorClass, typeid(Tarnik::InvalidStateException)) << operation;
     EXPECT_THAT(outcome.message,

@@ -136,14 +136,14 @@ class CertificatePeriodTest : public HolderOfKeyTest,
 
 class OutOfPeriodTest : public CertificatePeriodTest {};
 
-TEST_P(OutOfPeriodTest, FailsEverySignatureAndSendsNothing) {
+TEST_P(OutOfPeriodTest, FailsEveryRequestThatCarriesTheCertificateAndSendsNothing) {
   const auto certificate = ConfigOf(credential_).certificate;
   const std::string expected =
       "The holder-of-key certificate of `CN=holder' " + std::string(GetParam().reason) +
       (GetParam().notAfter < seconds(0) ? certificate->NotAfter() : certificate->NotBefore())
           .ToString();
   for (const Operation operation :
-       {Operation::Password, Operation::Certificate, Operation::Token, Operation::Renew}) {
+       {Operation::Password, Operation::Certificate, Operation::Renew}) {
     const Outcome outcome = CallNow(operation, *service_, arguments_);
     EXPECT_EQ(outcome.errorClass, typeid(Tarnik::InvalidStateException)) << operation;
     EXPECT_EQ(outcome.message, expected) << operation;
@@ -151,7 +151,10 @@ TEST_P(OutOfPeriodTest, FailsEverySignatureAndSendsNothing) {
   EXPECT_THAT(Sts().Requests(), IsEmpty());
 }
 
-TEST_P(OutOfPeriodTest, DoesNotAffectUnsignedRequests) {
+TEST_P(OutOfPeriodTest, DoesNotAffectRequestsWithoutTheCertificate) {
+  const Outcome byToken = CallNow(Operation::Token, *service_, arguments_);
+  ASSERT_TRUE(byToken.IsSuccess()) << byToken.message;
+  EXPECT_EQ(byToken.token->ConfirmationType(), HOLDER_OF_KEY);
   EXPECT_EQ(CallNow(Operation::Validate, *service_, arguments_).verdict, true);
   arguments_.spec.confirmation = CONFIRMATION_BEARER;
   const Outcome outcome = CallNow(Operation::Password, *service_, arguments_);

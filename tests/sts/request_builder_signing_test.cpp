@@ -216,11 +216,10 @@ TEST(RequestSigningDelegationTest, ARequestForADelegatedTokenHasNoUseKey) {
   EXPECT_THAT(request.body, Not(HasSubstr("UseKey")));
 }
 
-TEST(RequestSigningCertificateTest, NothingIsSignedWithAnExpiredCertificate) {
+TEST(RequestSigningCertificateTest, NoRequestCarriesAnExpiredCertificate) {
   const RequestBuilderImpl builder(ConfigOf(KeyCredential(DevSts::KeyType::Rsa2048, -2h, -1h)));
-  for (const BuildOperation& operation :
-       {BuildOperation(ByPassword), BuildOperation(InitialLeg), BuildOperation(ByCertificate),
-        BuildOperation(ByToken), BuildOperation(Renew)}) {
+  for (const BuildOperation& operation : {BuildOperation(ByPassword), BuildOperation(InitialLeg),
+                                          BuildOperation(ByCertificate), BuildOperation(Renew)}) {
     SoapRequest request;
     EXPECT_THAT(
         ThrownMessage<InvalidStateException>([&] { operation(builder, SpecOf(60), request); }),
@@ -230,6 +229,14 @@ TEST(RequestSigningCertificateTest, NothingIsSignedWithAnExpiredCertificate) {
   SoapRequest request;
   ByPassword(builder, SpecOf(60, CONFIRMATION_BEARER), request);
   EXPECT_NE(request.body, "");
+}
+
+TEST(RequestSigningCertificateTest, ARequestByTokenIsSignedAfterTheCertificateHasExpired) {
+  const RequestBuilderImpl builder(ConfigOf(KeyCredential(DevSts::KeyType::Rsa2048, -2h, -1h)));
+  SoapRequest request;
+  ByToken(builder, SpecOf(60), request);
+  EXPECT_THAT(request.body, HasSubstr("holderOfKeyProofSignature"));
+  EXPECT_THAT(request.body, Not(HasSubstr("BinarySecurityToken")));
 }
 
 TEST(RequestSigningLayoutTest, OperationsKeepTheirSlotOrder) {

@@ -2,6 +2,7 @@
 
 #include <string>
 #include <typeinfo>
+#include <vector>
 
 #include <gtest/gtest.h>
 
@@ -9,6 +10,7 @@
 #include <tarnik/core/exception.h>
 
 #include "sts/answers.h"
+#include "sts/log_capture.h"
 #include "support/parse_xml.h"
 
 namespace SsoClient::Testing {
@@ -141,6 +143,21 @@ TEST(SoapFaultTest, OnlyTheFirstFaultCodeAndTheFirstFaultStringCount) {
   EXPECT_EQ(ThrownFor(Envelope(Fault("<faultcode>S:Server</faultcode>"
                                      "<faultcode>wst:FailedAuthentication</faultcode>"))),
             Expect<SsoException>("Unexpected SOAP fault: S:Server; request failed."));
+}
+
+TEST(SoapFaultTest, TheFaultStringOfARefusedTimestampIsLogged) {
+  const LogCapture log(4);
+  const std::string fault = "<faultcode>wsse:InvalidSecurity</faultcode><faultstring>";
+  ThrownFor(Envelope(Fault(fault + "The clock&#10;is ahead</faultstring>")));
+  ThrownFor(Envelope(Fault(fault + std::string(60000, 'x') + "</faultstring>")));
+  ThrownFor(Envelope(Fault(fault + "</faultstring>")));
+  ThrownFor(
+      Envelope(Fault("<faultcode>S:Server</faultcode><faultstring>not a timestamp</faultstring>")));
+  ThrownFor(Envelope(
+      Fault("<faultcode>wst:FailedAuthentication</faultcode><faultstring>no</faultstring>")));
+  const std::string line = "4 The service answered with fault `wsse:InvalidSecurity': ";
+  EXPECT_EQ(log.Lines(), (std::vector<std::string>{line + "The clock?is ahead",
+                                                   line + std::string(1000, 'x') + "..."}));
 }
 
 }  // namespace

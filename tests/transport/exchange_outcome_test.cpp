@@ -59,6 +59,16 @@ TEST(ExchangeOutcomeTest, AnyOtherStatusIsAFailureThatNamesIt) {
   }
 }
 
+TEST(ExchangeOutcomeTest, TheReasonOfAStatusIsBoundedAndCleaned) {
+  const auto messageFor = [](const std::string& reason) {
+    return InterpretResponse(*Tarnik::MakeRef<FakeResponse>(503, reason)).failure->Message();
+  };
+  EXPECT_EQ(messageFor("Größe"), "Server returned error: 503 Größe");
+  EXPECT_EQ(messageFor("a\x1b[2J\tb\xff"), "Server returned error: 503 a?[2J?b?");
+  EXPECT_EQ(messageFor(std::string(60000, 'x')),
+            "Server returned error: 503 " + std::string(256, 'x') + "...");
+}
+
 TEST(ExchangeOutcomeTest, AFailureToReadTheResponseIsAFailureOfTheExchange) {
   const auto response = Tarnik::MakeRef<FakeResponse>(200, "OK");
   response->bodyFailure = "The body is gone.";

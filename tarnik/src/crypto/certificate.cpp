@@ -183,7 +183,8 @@ std::vector<Ref<const Certificate>> CreateCertificatesFromPem(std::string_view p
     }
   }
   if (certificates.empty()) {
-    throw CryptoException("The PEM text holds no certificate.");
+    throw CryptoException(std::string("The PEM text holds no certificate") +
+                          DescribeMissingPem(pem));
   }
   return certificates;
 }

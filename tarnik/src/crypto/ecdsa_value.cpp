@@ -40,9 +40,10 @@ std::vector<unsigned char> DerFromRawEcdsa(const std::vector<unsigned char>& val
   if (BN_is_zero(r.get()) || BN_is_zero(s.get())) {
     return {};
   }
+  const OpenSsl::ErrorScope errors;
   const OpenSsl::OwnedEcdsaSignature signature(ECDSA_SIG_new());
   if (signature == nullptr || ECDSA_SIG_set0(signature.get(), r.get(), s.get()) != 1) {
-    throw CryptoException("The ECDSA signature cannot be encoded.");
+    throw CryptoException(errors.Describe("The ECDSA signature cannot be encoded"));
   }
   // The signature owns both numbers now.
   static_cast<void>(r.release());

@@ -1,5 +1,9 @@
+#include <cstdio>
+#include <string_view>
+
 #include <openssl/err.h>
 #include <openssl/ui.h>
+#include <sys/stat.h>
 
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/crypto/private_key.h>
@@ -8,6 +12,7 @@
 #include "crypto/private_key_impl.h"
 #include "support/openssl_error.h"
 #include "support/quote.h"
+#include "system/file.h"
 
 namespace Tarnik::Crypto {
 namespace {
@@ -78,6 +83,54 @@ OpenSsl::OwnedKey OnlyKeyOf(OSSL_STORE_CTX* store, const std::string& scheme) {
   return found;
 }
 
+// The path of a URI of a local file (RFC 8089, section 2), as OpenSSL reads it, or nothing.
+std::string PathOf(const std::string& uri) {
+  constexpr std::string_view kScheme = "file:";
+  constexpr std::string_view kLocalHost = "//localhost/";
+  std::string_view rest(uri);
+  if (rest.substr(0, kScheme.size()) != kScheme) {
+    return "";
+  }
+  rest.remove_prefix(kScheme.size());
+  if (rest.substr(0, kLocalHost.size()) == kLocalHost) {
+    return std::string(rest.substr(kLocalHost.size() - 1));
+  }
+  if (rest.substr(0, 3) == "///") {
+    return std::string(rest.substr(2));
+  }
+  return rest.substr(0, 2) == "//" ? "" : std::string(rest);
+}
+
+bool IsFolder(std::FILE* file) {
+  struct stat status {};
+  return fstat(fileno(file), &status) == 0 && S_ISDIR(status.st_mode);
+}
+
+// OpenSSL opens files in descriptors that child processes inherit, so a file is opened here. The
+// store reads the source, which must outlive it.
+OpenSsl::OwnedBio OpenSource(const std::string& uri) {
+  const std::string path = PathOf(uri);
+  System::OwnedFile file = path.empty() ? nullptr : System::OpenForReading(path);
+  if (file == nullptr || IsFolder(file.get())) {
+    return nullptr;
+  }
+  OpenSsl::OwnedBio source(BIO_new_fp(file.get(), BIO_CLOSE));
+  if (source != nullptr) {
+    static_cast<void>(file.release());
+  }
+  return source;
+}
+
+OpenSsl::OwnedStore OpenStore(const std::string& uri, BIO* source, const UI_METHOD* method,
+                              Passphrase& passphrase) {
+  if (source != nullptr) {
+    return OpenSsl::OwnedStore(OSSL_STORE_attach(source, "file", nullptr, nullptr, method,
+                                                 &passphrase, nullptr, nullptr, nullptr));
+  }
+  return OpenSsl::OwnedStore(OSSL_STORE_open_ex(uri.c_str(), nullptr, nullptr, method, &passphrase,
+                                                nullptr, nullptr, nullptr));
+}
+
 }  // namespace
 
 Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
@@ -86,8 +139,8 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
   const OpenSsl::ErrorScope errors;
   Passphrase asked(passphrase);
   const OwnedUiMethod method = CreateUiMethod(errors);
-  const OpenSsl::OwnedStore store(OSSL_STORE_open_ex(uri.c_str(), nullptr, nullptr, method.get(),
-                                                     &asked, nullptr, nullptr, nullptr));
+  const OpenSsl::OwnedBio source = OpenSource(uri);
+  const OpenSsl::OwnedStore store = OpenStore(uri, source.get(), method.get(), asked);
   OpenSsl::OwnedKey key;
   if (store != nullptr && OSSL_STORE_expect(store.get(), OSSL_STORE_INFO_PKEY) == 1) {
     key = OnlyKeyOf(store.get(), scheme);

@@ -39,6 +39,14 @@ PemBlock::~PemBlock() {
   Release(bytes_, capacity_);
 }
 
+const char* DescribeMissingPem(std::string_view text) noexcept {
+  // Certificates, keys and revocation lists are sequences.
+  constexpr char kSequence = '\x30';
+  const bool isDer = text.size() > 1 && text.front() == kSequence &&
+                     (static_cast<unsigned char>(text[1]) & 0x80) != 0;
+  return isDer ? ": it is DER." : ".";
+}
+
 PemReader::PemReader(std::string_view pem) {
   const OpenSsl::ErrorScope errors;
   if (pem.size() > INT_MAX) {

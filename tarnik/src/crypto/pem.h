@@ -36,6 +36,10 @@ class PemBlock {
   std::size_t capacity_ = 0;
 };
 
+/// ": it is DER" when `text`, in which no block was found, starts like DER (X.690, section 8.1), or
+/// nothing; then a full stop. The end of a message.
+const char* DescribeMissingPem(std::string_view text) noexcept;
+
 /// Reads the blocks of a PEM text in order.
 class PemReader {
  public:

@@ -57,7 +57,8 @@ PemBlock OnlyKeyBlock(std::string_view pem) {
     found.emplace(std::move(block));
   }
   if (!found) {
-    throw CryptoException("The PEM text holds no private key.");
+    throw CryptoException(std::string("The PEM text holds no private key") +
+                          DescribeMissingPem(pem));
   }
   return std::move(*found);
 }

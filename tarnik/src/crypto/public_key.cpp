@@ -1,6 +1,13 @@
 #include <array>
+#include <string>
 #include <string_view>
 #include <utility>
+
+#include <openssl/ecerr.h>
+#include <openssl/err.h>
+#include <openssl/rsaerr.h>
+
+#include <tarnik/crypto/crypto_exception.h>
 
 #include "crypto/public_key_impl.h"
 #include "support/openssl_error.h"
@@ -37,6 +44,55 @@ Curve CurveOf(const EVP_PKEY* key) noexcept {
   return name == SN_secp521r1 ? Curve::kP521 : Curve::kNone;
 }
 
+// What OpenSSL reports of an RSA signature whose value is that of another message or key (RFC 8017,
+// sections 8.1.2 and 8.2.2).
+bool IsRsaMismatch(unsigned long error) noexcept {
+  if (ERR_GET_LIB(error) != ERR_LIB_RSA) {
+    return false;
+  }
+  switch (ERR_GET_REASON(error)) {
+    case RSA_R_BAD_FIXED_HEADER_DECRYPT:
+    case RSA_R_BAD_PAD_BYTE_COUNT:
+    case RSA_R_BAD_SIGNATURE:
+    case RSA_R_BLOCK_TYPE_IS_NOT_01:
+    case RSA_R_DATA_TOO_LARGE:
+    case RSA_R_DATA_TOO_LARGE_FOR_MODULUS:
+    case RSA_R_FIRST_OCTET_INVALID:
+    case RSA_R_INVALID_PADDING:
+    case RSA_R_LAST_OCTET_INVALID:
+    case RSA_R_NULL_BEFORE_BLOCK_MISSING:
+    case RSA_R_PADDING_CHECK_FAILED:
+    case RSA_R_SLEN_CHECK_FAILED:
+    case RSA_R_SLEN_RECOVERY_FAILED:
+    case RSA_R_WRONG_SIGNATURE_LENGTH:
+      return true;
+    default:
+      return false;
+  }
+}
+
+// OpenSSL reports an RSA signature that does not match as an error, and an ECDSA one with the
+// result 0 and, if its numbers are out of range, this error.
+bool IsMismatch(int result, SignatureScheme scheme, unsigned long error) noexcept {
+  if (scheme == SignatureScheme::kEcdsa) {
+    return result == 0 && (error == 0 || (ERR_GET_LIB(error) == ERR_LIB_EC &&
+                                          ERR_GET_REASON(error) == EC_R_BAD_SIGNATURE));
+  }
+  return IsRsaMismatch(error);
+}
+
+// A failure of OpenSSL says nothing about the signature.
+void RequireMismatch(int result, SignatureScheme scheme, const OpenSsl::ErrorReport& report) {
+  if (report.isOutOfMemory) {
+    throw CryptoException("There is not enough memory to verify the signature.");
+  }
+  if (!IsMismatch(result, scheme, report.cause)) {
+    const char* reason = report.cause == 0 ? nullptr : OpenSsl::ReasonOf(report.cause);
+    throw CryptoException(std::string("The cryptographic library cannot verify the signature") +
+                          (reason == nullptr ? "." : std::string(": ") + reason + "."));
+  }
+}
+
 }  // namespace
 
 PublicKeyImpl::PublicKeyImpl(OpenSsl::OwnedKey key)
@@ -54,14 +110,16 @@ PublicKeyImpl::~PublicKeyImpl() = default;
 
 bool PublicKeyImpl::Verify(SignatureScheme scheme, Hash hash, const unsigned char* digest,
                            const unsigned char* signature, std::size_t signatureLength) const {
-  const OpenSsl::ErrorScope errors;
+  const OpenSsl::FreshErrors errors;
   OpenSsl::OwnedKeyContext context = contexts_.Take(key_.get(), scheme, hash);
-  // Zero means a wrong signature. An error, which is negative, is treated in the same way.
-  if (EVP_PKEY_verify(context.get(), signature, signatureLength, digest, HashLength(hash)) != 1) {
-    return false;
+  const int result =
+      EVP_PKEY_verify(context.get(), signature, signatureLength, digest, HashLength(hash));
+  if (result == 1) {
+    contexts_.Keep(scheme, hash, std::move(context));
+    return true;
   }
-  contexts_.Keep(scheme, hash, std::move(context));
-  return true;
+  RequireMismatch(result, scheme, errors.Take());
+  return false;
 }
 
 }  // namespace Tarnik::Crypto

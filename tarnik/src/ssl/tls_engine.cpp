@@ -27,6 +27,18 @@ std::string TakeReason() {
   return text;
 }
 
+constexpr std::size_t kRecordHeaderSize = 5;
+
+// A record of a content type that a handshake may start with, of any version (RFC 8446, section
+// 5.1).
+bool StartsLikeTls(const std::string& bytes) {
+  constexpr char kAlert = 21;
+  constexpr char kHandshake = 22;
+  constexpr char kMajorVersion = 3;
+  return bytes.empty() || ((bytes[0] == kAlert || bytes[0] == kHandshake) &&
+                           (bytes.size() < 2 || bytes[1] == kMajorVersion));
+}
+
 TlsEngine* EngineOf(const SSL* ssl) {
   return static_cast<TlsEngine*>(SSL_get_app_data(ssl));
 }
@@ -117,7 +129,21 @@ std::size_t TlsEngine::Write(const char* data, std::size_t size) {
   return static_cast<std::size_t>(result);
 }
 
+// OpenSSL's words for an answer that is not TLS differ between releases and between first bytes.
+void TlsEngine::ExamineStart(const char* data, std::size_t size) {
+  if (start_.size() == kRecordHeaderSize) {
+    return;
+  }
+  start_.append(data, std::min(size, kRecordHeaderSize - start_.size()));
+  if (start_ == "HTTP/") {
+    notTls_ = "the peer answers in plain HTTP";
+  } else if (!StartsLikeTls(start_)) {
+    notTls_ = "the peer does not answer in TLS";
+  }
+}
+
 void TlsEngine::Feed(const char* data, std::size_t size) {
+  ExamineStart(data, size);
   if (BIO_write(input_, data, ToInt(size)) != ToInt(size)) {
     Fail("Cannot take in data from");
   }
@@ -135,7 +161,7 @@ void TlsEngine::TakeOutput(std::vector<char>& taken) {
 
 void TlsEngine::FailAtEndOfInput() const {
   if (!isHandshakeDone_) {
-    throw HandshakeError("the peer closed the connection");
+    throw HandshakeError(notTls_ == nullptr ? "the peer closed the connection" : notTls_);
   }
   throw SSLException("The TLS connection with " + host_ +
                      " was closed without close_notify: the data may be cut off.");
@@ -148,6 +174,9 @@ SSLException TlsEngine::HandshakeError(const std::string& cause) const {
 void TlsEngine::Fail(const std::string& operation) {
   hasFailed_ = true;
   const std::string reason = TakeReason();
+  if (!isHandshakeDone_ && notTls_ != nullptr) {
+    throw HandshakeError(notTls_);
+  }
   if (!isHandshakeDone_) {
     throw HandshakeError(check_.Failure().empty() ? reason : check_.Failure());
   }

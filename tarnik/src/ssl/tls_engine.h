@@ -51,6 +51,7 @@ class TlsEngine {
   static int OnNewSession(SSL* ssl, SSL_SESSION* session);
 
   void Resume();
+  void ExamineStart(const char* data, std::size_t size);
   [[noreturn]] void Fail(const std::string& operation);
 
   const Ref<SSLContextImpl> context_;
@@ -60,6 +61,8 @@ class TlsEngine {
   OpenSsl::OwnedSsl ssl_;
   BIO* input_ = nullptr;   // owned by `ssl_`
   BIO* output_ = nullptr;  // owned by `ssl_`
+  std::string start_;      // the first bytes of the peer, until they show whether it speaks TLS
+  const char* notTls_ = nullptr;  // how the peer answers if it does not speak TLS
   bool isHandshakeDone_ = false;
   bool hasFailed_ = false;
 };

@@ -1,20 +1,29 @@
 #include "ssl/trust_store.h"
 
 #include <cerrno>
+#include <cstdio>
+#include <memory>
 #include <string>
 #include <system_error>
 
+#include <openssl/pem.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/ssl/ssl_exception.h>
 
+#include "ssl/ca_folder.h"
 #include "ssl/decode_certificate.h"
+#include "ssl/revocation.h"
 #include "support/openssl_error.h"
+#include "system/file.h"
 
 namespace Tarnik::Ssl {
 namespace {
+
+// Without it OpenSSL would ask for the passphrase of an encrypted key on the terminal.
+constexpr const char* kNoPassphrase = "";
 
 // OpenSSL words the failure to read a file differently from the system, and does not report a
 // missing folder at all.
@@ -32,13 +41,68 @@ bool IsFolder(const std::string& path) {
   return stat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
 }
 
-void LoadCaFile(X509_STORE* store, const std::string& path) {
-  const std::string what = "Cannot load CA certificates from";
-  RequireReadable(path, R_OK, what);
-  const OpenSsl::ErrorScope errors;
-  if (X509_STORE_load_file(store, path.c_str()) != 1) {
-    throw SSLException(errors.Describe(what + " '" + path + "'"));
+/// A PEM file that is read to its end.
+class PemFile {
+ public:
+  /// `what` is the start of the messages.
+  PemFile(const std::string& path, const std::string& what) : what_(what + " '" + path + "'") {
+    RequireReadable(path, R_OK, what);
+    System::OwnedFile file = System::OpenForReading(path);
+    const std::string reason = std::system_category().message(errno);
+    source_.reset(file == nullptr ? nullptr : BIO_new_fp(file.get(), BIO_CLOSE));
+    if (source_ == nullptr) {
+      throw SSLException(what_ + ": " + reason + ".");
+    }
+    first_ = std::ungetc(std::getc(file.get()), file.get());
+    static_cast<void>(file.release());
   }
+
+  /// Adds the certificates and revocation lists to `store`. Throws when there is nothing of the
+  /// kind that is asked for.
+  void AddTo(X509_STORE* store, bool isForLists) const {
+    const OpenSsl::ErrorScope errors;
+    const OwnedInfos infos(
+        PEM_X509_INFO_read_bio(source_.get(), nullptr, nullptr, const_cast<char*>(kNoPassphrase)));
+    if (infos == nullptr) {
+      throw SSLException(errors.Describe(what_));
+    }
+    bool isFound = false;
+    for (int i = 0; i < sk_X509_INFO_num(infos.get()); ++i) {
+      const X509_INFO* info = sk_X509_INFO_value(infos.get(), i);
+      if ((info->x509 != nullptr && !isForLists && X509_STORE_add_cert(store, info->x509) != 1) ||
+          (info->crl != nullptr && X509_STORE_add_crl(store, info->crl) != 1)) {
+        throw SSLException(errors.Describe(what_));
+      }
+      isFound = isFound || (isForLists ? info->crl != nullptr : info->x509 != nullptr);
+    }
+    if (!isFound) {
+      throw SSLException(what_ + ": " + WhatIsMissing(isForLists));
+    }
+  }
+
+ private:
+  struct FreeInfos {
+    void operator()(STACK_OF(X509_INFO) * infos) const noexcept {
+      sk_X509_INFO_pop_free(infos, X509_INFO_free);
+    }
+  };
+  using OwnedInfos = std::unique_ptr<STACK_OF(X509_INFO), FreeInfos>;
+
+  const char* WhatIsMissing(bool isForLists) const noexcept {
+    constexpr int kSequence = 0x30;  // what DER starts with (X.690, section 8.1)
+    if (first_ == kSequence) {
+      return "it is DER; PEM is expected.";
+    }
+    return isForLists ? "it holds no revocation list in PEM." : "it holds no certificate in PEM.";
+  }
+
+  std::string what_;
+  OpenSsl::OwnedBio source_;
+  int first_ = EOF;
+};
+
+void LoadCaFile(X509_STORE* store, const std::string& path) {
+  PemFile(path, "Cannot load CA certificates from").AddTo(store, false);
 }
 
 void LoadCaFolder(X509_STORE* store, const std::string& path) {
@@ -48,7 +112,7 @@ void LoadCaFolder(X509_STORE* store, const std::string& path) {
     throw SSLException(what + " '" + path + "': it is not a folder.");
   }
   const OpenSsl::ErrorScope errors;
-  if (X509_STORE_load_path(store, path.c_str()) != 1) {
+  if (!AddCaFolder(store, path)) {
     throw SSLException(errors.Describe(what + " '" + path + "'"));
   }
 }
@@ -84,13 +148,7 @@ void LoadSystemStore(X509_STORE* store) {
 }
 
 void LoadCrlFile(X509_STORE* store, const std::string& path) {
-  const std::string what = "Cannot load revocation lists from";
-  RequireReadable(path, R_OK, what);
-  const OpenSsl::ErrorScope errors;
-  X509_LOOKUP* lookup = X509_STORE_add_lookup(store, X509_LOOKUP_file());
-  if (lookup == nullptr || X509_load_crl_file(lookup, path.c_str(), X509_FILETYPE_PEM) < 1) {
-    throw SSLException(errors.Describe(what + " '" + path + "'"));
-  }
+  PemFile(path, "Cannot load revocation lists from").AddTo(store, true);
 }
 
 }  // namespace
@@ -112,7 +170,7 @@ void LoadTrust(const SSLContextConfig& config, X509_STORE* store) {
     LoadCrlFile(store, path);
   }
   if (!config.crlFiles.empty()) {
-    X509_STORE_set_flags(store, X509_V_FLAG_CRL_CHECK | X509_V_FLAG_CRL_CHECK_ALL);
+    CheckRevocation(store);
   }
 }
 

@@ -4,7 +4,6 @@
 #include <cerrno>
 #include <cstddef>
 #include <cstdio>
-#include <memory>
 #include <system_error>
 
 #include <openssl/crypto.h>
@@ -15,10 +14,6 @@ namespace Tarnik::System {
 namespace {
 
 constexpr std::size_t kMaxFileBytes = std::size_t{16} << 20;
-
-struct CloseFile {
-  void operator()(std::FILE* file) const noexcept { static_cast<void>(std::fclose(file)); }
-};
 
 /// A buffer whose destructor overwrites it.
 struct Buffer {
@@ -34,11 +29,15 @@ struct Buffer {
 
 }  // namespace
 
+OwnedFile OpenForReading(const std::string& path) {
+  return OwnedFile(std::fopen(path.c_str(), "rbe"));
+}
+
 void ReadFile(std::string_view kind, const std::string& path, SensitiveText& text) {
   if (path.find('\0') != std::string::npos) {
     throw IOException("The path of the " + std::string(kind) + " file holds a NUL.");
   }
-  const std::unique_ptr<std::FILE, CloseFile> file(std::fopen(path.c_str(), "rbe"));
+  const OwnedFile file = OpenForReading(path);
   if (file == nullptr) {
     ThrowUnreadable(kind, path, std::generic_category().message(errno));
   }

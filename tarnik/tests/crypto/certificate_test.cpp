@@ -172,6 +172,9 @@ TEST(CertificatesFromPemTest, ReadsEveryCertificateInOrderAndSkipsOtherBlocks) {
 TEST(CertificatesFromPemTest, RefusesTextWithoutCertificates) {
   EXPECT_EQ(PemError(""), "The PEM text holds no certificate.");
   EXPECT_EQ(PemError("nothing here"), "The PEM text holds no certificate.");
+  EXPECT_EQ(PemError("0"), "The PEM text holds no certificate.");
+  const auto der = MakeCertificateDer();
+  EXPECT_EQ(PemError({der.begin(), der.end()}), "The PEM text holds no certificate: it is DER.");
   EXPECT_EQ(PemError(ToPem({1, 2, 3}, "PUBLIC KEY")), "The PEM text holds no certificate.");
 }
 

@@ -2,9 +2,11 @@
 #include <cstddef>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
+#include <sys/socket.h>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/ssl/ssl_context.h>
@@ -30,18 +32,26 @@ INSTANTIATE_TEST_SUITE_P(Versions, SSLStreamTcpAsyncTest,
                          testing::Values(TLS1_2_VERSION, TLS1_3_VERSION), NameOfVersion);
 
 TEST_P(SSLStreamTcpAsyncTest, ReportsAPeerThatDoesNotSpeakTls) {
-  LoopbackListener listener;
-  std::thread peer([&] {
-    const auto socket = listener.Accept();
-    SendAll(socket.Get(), "HTTP/1.1 400 Bad Request\r\n\r\n");
-    ReceiveExactly(socket.Get(), 100000);
-  });
-  {
-    const TlsClient client(*context_, listener.Port());
-    EXPECT_EQ(client.Message(), "TLS handshake with sts.example failed: wrong version number");
-    EXPECT_TRUE(client.Handshake().IsError<SSLException>());
+  const std::string plainHttp = "the peer answers in plain HTTP";
+  const std::string other = "the peer does not answer in TLS";
+  for (const auto& [answer, reason] :
+       {std::pair{std::string("HTTP/1.1 400 Bad Request\r\n\r\n"), plainHttp},
+        std::pair{std::string("220 mail.example ESMTP\r\n"), other},
+        std::pair{std::string("\x16HTTP/1.1"), other}, std::pair{std::string("H"), other}}) {
+    LoopbackListener listener;
+    std::thread peer([&listener, text = answer] {
+      const auto socket = listener.Accept();
+      SendAll(socket.Get(), text);
+      shutdown(socket.Get(), SHUT_WR);
+      ReceiveExactly(socket.Get(), 100000);
+    });
+    {
+      const TlsClient client(*context_, listener.Port());
+      EXPECT_EQ(client.Message(), "TLS handshake with sts.example failed: " + reason);
+      EXPECT_TRUE(client.Handshake().IsError<SSLException>());
+    }
+    peer.join();
   }
-  peer.join();
 }
 
 TEST_P(SSLStreamTcpAsyncTest, TransfersMuchDataInBothDirectionsAtOnce) {

@@ -1,21 +1,16 @@
 #include "ssl/trust_store.h"
 
-#include <cstdio>
-#include <cstdlib>
-#include <memory>
 #include <string>
-#include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/ssl/ssl_context.h>
 #include <tarnik/ssl/ssl_exception.h>
 
 #include "ssl/tls_fixture.h"
+#include "support/ca_folder.h"
 #include "support/test_pki.h"
 #include "support/thrown_message.h"
 #include "support/tls_peer.h"
@@ -107,20 +102,34 @@ TEST(TrustStoreTest, LoadsCaFiles) {
 }
 
 TEST(TrustStoreTest, LoadsCaFoldersByHash) {
-  std::string folder = testing::TempDir() + "tarnik_XXXXXX";
-  ASSERT_NE(mkdtemp(folder.data()), nullptr);
-  char name[16];
-  std::snprintf(name, sizeof(name), "/%08lx.0",
-                X509_NAME_hash_ex(X509_get_subject_name(TestPki::Get().root.certificate.get()),
-                                  nullptr, nullptr, nullptr));
-  const std::string path = folder + name;
-  const TemporaryFile root(TestPki::Get().root.Pem());
-  ASSERT_EQ(symlink(root.Path().c_str(), path.c_str()), 0);
+  const CaFolder folder;
+  folder.Add(TestPki::Get().root, 0);
   SSLContextConfig config;
-  config.caFolders = {folder};
+  config.caFolders = {folder.Path()};
   EXPECT_EQ(Handshake(config, LeafPeer()), "");
-  unlink(path.c_str());
-  rmdir(folder.c_str());
+}
+
+TEST(TrustStoreTest, LooksThroughAllFoldersAndAllFilesOfAName) {
+  const CaFolder folder;
+  const CaFolder empty;
+  // Another CA of the same name comes first.
+  folder.Add(MakeCa("Root"), 0);
+  folder.Add(TestPki::Get().root, 1);
+  SSLContextConfig config;
+  config.caFolders = {empty.Path(), folder.Path()};
+  EXPECT_EQ(Handshake(config, LeafPeer()), "");
+  config.caFolders = {empty.Path()};
+  EXPECT_THAT(Handshake(config, LeafPeer()), testing::HasSubstr("unable to get local issuer"));
+}
+
+TEST(TrustStoreTest, FindsACertificateThatWasAddedToAFolderLater) {
+  const CaFolder folder;
+  SSLContextConfig config;
+  config.caFolders = {folder.Path()};
+  const auto context = CreateSSLContext(config);
+  folder.Add(TestPki::Get().root, 0);
+  TlsServer server(LeafPeer(), 1);
+  EXPECT_EQ(TlsClient(*context, server.Port()).Message(), "");
 }
 
 TEST(TrustStoreTest, LoadsTheSystemStore) {
@@ -159,6 +168,20 @@ TEST(TrustStoreTest, NamesWhatItCannotLoad) {
               testing::StartsWith("Cannot load revocation lists from '" + garbage.Path() + "': "));
 }
 
+TEST(TrustStoreTest, SaysThatAFileIsDer) {
+  const auto certificate = TestPki::Get().root.ToCertificate();
+  const TemporaryFile der(std::string(reinterpret_cast<const char*>(certificate->DerBytes()),
+                                      certificate->DerLength()));
+  SSLContextConfig config;
+  config.caFiles = {der.Path()};
+  EXPECT_EQ(MessageOf(config),
+            "Cannot load CA certificates from '" + der.Path() + "': it is DER; PEM is expected.");
+  config.caFiles = {};
+  config.crlFiles = {der.Path()};
+  EXPECT_EQ(MessageOf(config),
+            "Cannot load revocation lists from '" + der.Path() + "': it is DER; PEM is expected.");
+}
+
 TEST(TrustStoreTest, RefusesNullCertificates) {
   SSLContextConfig config;
   config.caCertificates = {nullptr};
@@ -166,49 +189,6 @@ TEST(TrustStoreTest, RefusesNullCertificates) {
   config.caCertificates = {};
   config.pinnedCertificates = {nullptr};
   EXPECT_THROW(CreateSSLContext(config), InvalidArgumentException);
-}
-
-std::string HandshakeWithCrls(const std::vector<std::string>& crls, const TlsPeerOptions& peer) {
-  std::vector<std::unique_ptr<TemporaryFile>> files;
-  SSLContextConfig config = TrustingConfig(TestPki::Get().root);
-  for (const std::string& crl : crls) {
-    files.push_back(std::make_unique<TemporaryFile>(crl));
-    config.crlFiles.push_back(files.back()->Path());
-  }
-  return Handshake(config, peer);
-}
-
-TEST(TrustStoreTest, RefusesARevokedPeer) {
-  const Identity& root = TestPki::Get().root;
-  const Identity& leaf = TestPki::Get().leaf;
-  EXPECT_EQ(HandshakeWithCrls({MakeCrl(root, nullptr)}, LeafPeer()), "");
-  EXPECT_EQ(HandshakeWithCrls({MakeCrl(root, &leaf)}, LeafPeer()),
-            "TLS handshake with sts.example failed: certificate revoked (CN=sts.example)");
-}
-
-TEST(TrustStoreTest, RefusesAPeerWhoseRevocationListIsMissingOrExpired) {
-  const Identity stranger = MakeCa("Stranger");
-  EXPECT_EQ(HandshakeWithCrls({MakeCrl(stranger, nullptr)}, LeafPeer()),
-            "TLS handshake with sts.example failed: unable to get certificate CRL "
-            "(CN=sts.example)");
-  EXPECT_EQ(HandshakeWithCrls({MakeCrl(TestPki::Get().root, nullptr, -60)}, LeafPeer()),
-            "TLS handshake with sts.example failed: CRL has expired (CN=sts.example)");
-}
-
-TEST(TrustStoreTest, ChecksTheWholeChainForRevocation) {
-  const Identity& root = TestPki::Get().root;
-  const Identity& intermediate = TestPki::Get().intermediate;
-  const Identity leaf = MakeIdentity({}, &intermediate);
-  TlsPeerOptions peer;
-  peer.identity = &leaf;
-  peer.chain = {&intermediate};
-  const std::string ofIntermediate = MakeCrl(intermediate, nullptr);
-  EXPECT_EQ(HandshakeWithCrls({ofIntermediate, MakeCrl(root, nullptr)}, peer), "");
-  EXPECT_EQ(HandshakeWithCrls({ofIntermediate, MakeCrl(root, &intermediate)}, peer),
-            "TLS handshake with sts.example failed: certificate revoked (CN=Intermediate)");
-  EXPECT_EQ(HandshakeWithCrls({ofIntermediate}, peer),
-            "TLS handshake with sts.example failed: unable to get certificate CRL "
-            "(CN=Intermediate)");
 }
 
 }  // namespace

@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdlib>
+#include <ctime>
 #include <stdexcept>
 #include <string>
 
@@ -73,6 +74,15 @@ void AddNames(X509* certificate, const IdentityOptions& options) {
   }
 }
 
+// Required of revocation lists (RFC 5280, section 5.2.1).
+void AddKeyIdentifier(X509_CRL* crl, X509* issuer) {
+  X509V3_CTX context;
+  X509V3_set_ctx(&context, issuer, nullptr, nullptr, crl, 0);
+  const OpenSsl::Owned<X509_EXTENSION, X509_EXTENSION_free> extension(
+      X509V3_EXT_conf_nid(nullptr, &context, NID_authority_key_identifier, "keyid:always"));
+  Require(extension != nullptr && X509_CRL_add_ext(crl, extension.get(), -1) == 1);
+}
+
 EVP_PKEY* MakeKey(unsigned rsaBits) {
   return rsaBits == 0 ? EVP_EC_gen("P-256") : EVP_RSA_gen(rsaBits);
 }
@@ -128,13 +138,15 @@ Identity MakeCa(const std::string& commonName, const Identity* issuer) {
   return MakeIdentity(options, issuer);
 }
 
-std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUpdate) {
+std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUpdate,
+                    long thisUpdate, std::time_t now) {
   const OpenSsl::OwnedCrl crl(X509_CRL_new());
   Require(X509_CRL_set_version(crl.get(), X509_CRL_VERSION_2) == 1);
   Require(X509_CRL_set_issuer_name(crl.get(), X509_get_subject_name(issuer.certificate.get())) ==
           1);
-  const OpenSsl::Owned<ASN1_TIME, ASN1_TIME_free> before(X509_gmtime_adj(nullptr, -3600));
-  const OpenSsl::Owned<ASN1_TIME, ASN1_TIME_free> next(X509_gmtime_adj(nullptr, nextUpdate));
+  const OpenSsl::Owned<ASN1_TIME, ASN1_TIME_free> before(
+      ASN1_TIME_adj(nullptr, now, 0, thisUpdate));
+  const OpenSsl::Owned<ASN1_TIME, ASN1_TIME_free> next(ASN1_TIME_adj(nullptr, now, 0, nextUpdate));
   Require(X509_CRL_set1_lastUpdate(crl.get(), before.get()) == 1);
   Require(X509_CRL_set1_nextUpdate(crl.get(), next.get()) == 1);
   if (revoked != nullptr) {
@@ -144,6 +156,7 @@ std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUp
     Require(X509_REVOKED_set_revocationDate(entry, before.get()) == 1);
     Require(X509_CRL_add0_revoked(crl.get(), entry) == 1);
   }
+  AddKeyIdentifier(crl.get(), issuer.certificate.get());
   Require(X509_CRL_sign(crl.get(), issuer.key.get(), EVP_sha256()) > 0);
   const OpenSsl::OwnedBio bio(BIO_new(BIO_s_mem()));
   Require(PEM_write_bio_X509_CRL(bio.get(), crl.get()) == 1);

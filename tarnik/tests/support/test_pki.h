@@ -1,6 +1,7 @@
 #ifndef TARNIK_TESTS_SUPPORT_TEST_PKI_H
 #define TARNIK_TESTS_SUPPORT_TEST_PKI_H
 
+#include <ctime>
 #include <string>
 #include <vector>
 
@@ -40,8 +41,9 @@ Identity MakeIdentity(const IdentityOptions& options, const Identity* issuer);
 Identity MakeCa(const std::string& commonName, const Identity* issuer = nullptr);
 
 /// A PEM revocation list of `issuer` that revokes `revoked`, or nothing if that is null.
-/// `nextUpdate` is in seconds from now.
-std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUpdate = 3600);
+/// `nextUpdate` and `thisUpdate` are in seconds from `now`.
+std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUpdate = 3600,
+                    long thisUpdate = -3600, std::time_t now = std::time(nullptr));
 
 /// A file in the folder for temporary files, removed with its owner.
 class TemporaryFile {

@@ -58,6 +58,8 @@ OpenSsl::OwnedSslContext MakeServerContext(const TlsPeerOptions& options) {
                 SSL_CTX_set_max_proto_version(context.get(), options.maxVersion) == 1 &&
                 SSL_CTX_set_cipher_list(context.get(), options.ciphers.c_str()) == 1 &&
                 SSL_CTX_set_session_id_context(context.get(), sessionContext, 4) == 1;
+  isGood = isGood && (options.signatures.empty() ||
+                      SSL_CTX_set1_sigalgs_list(context.get(), options.signatures.c_str()) == 1);
   SSL_CTX_set_dh_auto(context.get(), 1);
   if (options.identity != nullptr) {
     isGood = isGood &&

@@ -23,6 +23,8 @@ struct TlsPeerOptions {
   int maxVersion = TLS1_3_VERSION;
   std::string ciphers = "DEFAULT";
   int securityLevel = 2;
+  /// The signature algorithms that it makes, in OpenSSL's names; OpenSSL's defaults if empty.
+  std::string signatures = "";
   /// If set, the client must present a certificate issued by this CA.
   const Identity* clientCa = nullptr;
 };

@@ -27,7 +27,9 @@ class TARNIK_EXPORT SSLStream : public System::Stream {
                                     HandshakeCompletion completion) = 0;
 };
 
-/// Trust and sessions shared by TLS connections. Immutable; thread-safe. Supports TLS 1.2 and 1.3.
+/// Trust and sessions shared by TLS connections. Immutable; thread-safe. Supports TLS 1.3 and, with
+/// ECDHE and AES-GCM or ChaCha20-Poly1305, TLS 1.2 (RFC 9325); neither OpenSSL's configuration file
+/// nor the environment changes what is offered.
 /// Sessions are resumed only with the same host, on any port, and the same server name.
 class TARNIK_EXPORT SSLContext : public virtual Object {
  public:
@@ -48,6 +50,9 @@ struct SSLContextConfig {
   bool useSystemStore = false;
   /// PEM files of certificate revocation lists. If there is any, every certificate of a peer's
   /// chain is checked, and a certificate whose issuer's list is missing or out of date is rejected.
+  /// Of several lists of an issuer the newest by thisUpdate counts, since a newer list replaces the
+  /// older ones (RFC 5280, section 5): a certificate that was only on hold may be missing from it.
+  /// When several lists have that same date, a revocation in any of them counts.
   std::vector<std::string> crlFiles;
   /// If not empty, the peer's certificate must also equal one of these byte for byte.
   std::vector<Ref<const Crypto::Certificate>> pinnedCertificates;

@@ -13,12 +13,18 @@ void Check(bool succeeded, const OpenSsl::ErrorScope& errors) {
   }
 }
 
+OpenSsl::OwnedDigestContext NewContext() {
+  const OpenSsl::ErrorScope errors;
+  OpenSsl::OwnedDigestContext context(EVP_MD_CTX_new());
+  if (context == nullptr) {
+    throw Crypto::CryptoException("The digest cannot be computed: not enough memory.");
+  }
+  return context;
+}
+
 }  // namespace
 
-DigestWriter::DigestWriter() : context_(EVP_MD_CTX_new()) {
-  const OpenSsl::ErrorScope errors;
-  Check(context_ != nullptr, errors);
-}
+DigestWriter::DigestWriter() : context_(NewContext()) {}
 
 DigestWriter::~DigestWriter() = default;
 

@@ -14,6 +14,7 @@
 #include "xml/security/reference_targets.h"
 #include "xml/security/signature_impl.h"
 #include "xml/security/signature_plan.h"
+#include "xml/security/signer_description.h"
 
 namespace Tarnik::Xml::Security {
 namespace {
@@ -24,7 +25,8 @@ using Crypto::SignatureScheme;
 Ref<const Crypto::PublicKey> ResolveKey(const KeyInfoResolver& resolver, const KeyInfo& keyInfo) {
   Ref<const Crypto::PublicKey> key = resolver.Resolve(keyInfo);
   if (key == nullptr) {
-    throw XmlSecurityException("There is no trusted key for the signature.");
+    throw XmlSecurityException("There is no trusted key for the signature, " +
+                               DescribeSigner(keyInfo) + ".");
   }
   return key;
 }

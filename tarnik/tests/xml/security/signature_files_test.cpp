@@ -35,7 +35,10 @@ const FileCase kFiles[] = {
     {"valid-no-canonicalization.xml", "valid"},
     {"valid-line-ends.xml", "valid"},
     {"valid-namespace-with-apostrophes.xml", "valid"},
-    {"strangers-key.xml", "refused: There is no trusted key for the signature."},
+    {"strangers-key.xml",
+     "refused: There is no trusted key for the signature, whose certificate is of "
+     "'CN=stranger,O=Test', issued by 'CN=stranger,O=Test' with the serial number "
+     "'344872046231744251335646724077188031672883184384'."},
     {"rsa-1024.xml", "refused: The trusted RSA key has 1024 bits; at least 2048 are needed.",
      "weak"},
     {"sha1-digest.xml",

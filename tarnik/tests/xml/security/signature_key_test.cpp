@@ -25,11 +25,18 @@ using DevSts::SignOptions;
 constexpr const char* kWrongKeyType =
     "refused: The trusted key is not of the type of the signature algorithm.";
 
+std::string NoTrustedKeyFor(const DevSts::Credential& signer) {
+  const auto certificate = CertificateOf(signer);
+  return "refused: There is no trusted key for the signature, whose certificate is of '" +
+         certificate->SubjectName() + "', issued by '" + certificate->IssuerName() +
+         "' with the serial number '" + certificate->SerialNumber() + "'.";
+}
+
 TEST(SignatureKeyTest, IsNeverTakenFromTheMessage) {
   const std::string text = Signed({}, kUnsigned, Stranger());
   ASSERT_TRUE(DevSts::VerifyXml(text, Stranger().certificatePem));
   EXPECT_EQ(Verdict(text, Stranger()), "valid");
-  EXPECT_EQ(Verdict(text, Signer()), "refused: There is no trusted key for the signature.");
+  EXPECT_EQ(Verdict(text, Signer()), NoTrustedKeyFor(Stranger()));
 
   SignOptions bareKey;
   bareKey.keyInfo = DevSts::KeyInfoContent::KeyValue;
@@ -51,7 +58,7 @@ TEST(SignatureKeyTest, OfAStrangerWithTheTrustedNameIsNotTrusted) {
   ASSERT_EQ(CertificateOf(namesake)->SubjectName(), CertificateOf(Signer())->SubjectName());
   const std::string text = Signed({}, kUnsigned, namesake);
   EXPECT_EQ(Verdict(text, namesake), "valid");
-  EXPECT_EQ(Verdict(text, Signer()), "refused: There is no trusted key for the signature.");
+  EXPECT_EQ(Verdict(text, Signer()), NoTrustedKeyFor(namesake));
 }
 
 TEST(SignatureKeyTest, MustBeOfTheAlgorithmsType) {
@@ -130,8 +137,7 @@ TEST(SignatureKeyTest, OfAnotherImplementationIsRefused) {
 TEST(SignatureKeyTest, IsRequired) {
   EXPECT_EQ(Verdict(Signed(), nullptr),
             "refused: A signature cannot be verified without a key resolver.");
-  EXPECT_EQ(Verdict(Signed(), MakeRef<FixedKeyResolver>(nullptr).get()),
-            "refused: There is no trusted key for the signature.");
+  EXPECT_EQ(Verdict(Signed(), MakeRef<FixedKeyResolver>(nullptr).get()), NoTrustedKeyFor(Signer()));
 }
 
 class ThrowingResolver final : public KeyInfoResolver, public ObjectImpl {
