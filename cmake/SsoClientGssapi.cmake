@@ -16,3 +16,12 @@ function(ssoclient_find_gssapi found)
   endif()
   set(${found} TRUE PARENT_SCOPE)
 endfunction()
+
+# ssoclient_kerberos_signs_mechanisms(SIGNS): sets SIGNS to 1 if the Kerberos library answers a service that signs the list
+# of mechanisms (RFC 4178, section 5), otherwise to 0. MIT's 1.21 looks for the signature under another tag.
+function(ssoclient_kerberos_signs_mechanisms signs)
+  set(${signs} 1 PARENT_SCOPE)
+  if(SSOCLIENT_GSSAPI_krb5-gssapi_VERSION MATCHES "^1\\.21")
+    set(${signs} 0 PARENT_SCOPE)
+  endif()
+endfunction()

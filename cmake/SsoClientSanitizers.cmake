@@ -22,10 +22,10 @@ function(ssoclient_target_sanitizers)
   endforeach()
 endfunction()
 
-# ssoclient_target_unoptimized(TARGET...): does not optimise the targets under sanitizers. For code that only calls the
-# libraries under test, since optimising it takes longer than it saves.
+# ssoclient_target_unoptimized(TARGET...): does not optimise the targets in a build with tests. For code that only calls
+# the libraries under test, since optimising it takes longer than it saves.
 function(ssoclient_target_unoptimized)
-  if(NOT SSOCLIENT_SANITIZER)
+  if(NOT SSOCLIENT_BUILD_TESTS)
     return()
   endif()
   foreach(target IN LISTS ARGN)

@@ -10,8 +10,8 @@ target_link_libraries(ssoclient_test_pch PRIVATE GTest::gmock)
 target_precompile_headers(ssoclient_test_pch PRIVATE
   <gmock/gmock.h> <gtest/gtest.h> <memory> <string> <vector>)
 
-# ssoclient_configure_test_target(TARGET...): compiles test code. Under sanitizers, which are there to check the
-# libraries, the tests are neither optimised nor checked for undefined behaviour, since both take too long.
+# ssoclient_configure_test_target(TARGET...): compiles test code, which is not optimised. Under sanitizers, which are there
+# to check the libraries, the tests are not checked for undefined behaviour, since that takes too long.
 function(ssoclient_configure_test_target)
   ssoclient_configure_target(${ARGN})
   ssoclient_target_unoptimized(${ARGN})

@@ -5,6 +5,8 @@
 #include <gssapi/gssapi_ext.h>
 #include <gssapi/gssapi_krb5.h>
 
+#include "kerberos/spnego_token.h"
+
 namespace DevSts::Testing {
 namespace {
 
@@ -22,6 +24,14 @@ void Require(OM_uint32 major, const char* what) {
 
 gss_buffer_desc AsBuffer(const std::string& text) {
   return {text.size(), const_cast<char*>(text.data())};
+}
+
+gss_buffer_desc AsBuffer(const Octets& octets) {
+  return {octets.size(), const_cast<unsigned char*>(octets.data())};
+}
+
+Octets ToOctets(const std::string& text) {
+  return {text.begin(), text.end()};
 }
 
 }  // namespace
@@ -42,7 +52,30 @@ class GssClient::State {
   gss_cred_id_t credential = GSS_C_NO_CREDENTIAL;
   gss_name_t target = GSS_C_NO_NAME;
   gss_ctx_id_t context = GSS_C_NO_CONTEXT;
+  std::string firstLeg;
   bool isDone = false;
+
+  // The leg that answers the service's signature of the list of mechanisms (RFC 4178, section 5),
+  // empty if the service's leg has none.
+  std::string SignMechanisms(const std::string& serverLeg) {
+    const Octets mic = MicIn(ToOctets(serverLeg));
+    if (mic.empty()) {
+      return {};
+    }
+    const Octets mechTypes = MechTypesIn(ToOctets(firstLeg));
+    gss_buffer_desc message = AsBuffer(mechTypes);
+    gss_buffer_desc received = AsBuffer(mic);
+    gss_buffer_desc own = GSS_C_EMPTY_BUFFER;
+    OM_uint32 minor = 0;
+    Require(gss_verify_mic(&minor, context, &message, &received, nullptr), "check");
+    Require(gss_get_mic(&minor, context, GSS_C_QOP_DEFAULT, &message, &own), "signature");
+    const auto* const bytes = static_cast<const unsigned char*>(own.value);
+    const Octets signature(bytes, bytes + own.length);
+    gss_release_buffer(&minor, &own);
+    const Octets leg =
+        WithMic(WriteResponse(NegState::AcceptCompleted), NegState::AcceptCompleted, signature);
+    return {leg.begin(), leg.end()};
+  }
 };
 
 GssClient::GssClient(const std::string& cache, const std::string& service, OM_uint32 flags)
@@ -71,7 +104,12 @@ std::string GssClient::Step(const std::string& serverLeg) {
   gss_release_buffer(&minor, &output);
   Require(major, "leg");
   state_->isDone = major == GSS_S_COMPLETE;
-  return leg;
+  if (serverLeg.empty()) {
+    state_->firstLeg = leg;
+  }
+  // MIT Kerberos 1.21 overlooks the service's signature.
+  const bool isUnsigned = state_->isDone && leg.empty() && !serverLeg.empty();
+  return isUnsigned ? state_->SignMechanisms(serverLeg) : leg;
 }
 
 bool GssClient::IsDone() const {

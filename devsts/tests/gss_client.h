@@ -20,7 +20,8 @@ class GssClient {
   GssClient(const GssClient&) = delete;
   GssClient& operator=(const GssClient&) = delete;
 
-  // Takes the service's leg, which is empty at first, and returns the client's next leg.
+  // Takes the service's leg, which is empty at first, and returns the client's next leg. Signs the
+  // list of mechanisms when the service does, with any version of the Kerberos library.
   std::string Step(const std::string& serverLeg = {});
   // Whether the login is complete and the service has proved its identity.
   bool IsDone() const;

@@ -108,6 +108,7 @@ TEST_F(NegotiationTest, RefusesAWrongSignatureOfTheMechanisms) {
   NegotiationClient client(server);
   GssClient gss(alice, kService);
   std::string leg = gss.Step(LegIn(client.SendFirst(gss.Step())));
+  ASSERT_FALSE(leg.empty());
   leg.back() = static_cast<char>(leg.back() ^ 1);
   ExpectFault(client.SendNext(leg), "wst:FailedAuthentication",
               "The negotiation failed: A token had an invalid Message Integrity Check (MIC)");

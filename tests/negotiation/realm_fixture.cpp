@@ -44,9 +44,10 @@ const auto* const registered = testing::AddGlobalTestEnvironment(environment);
 
 }  // namespace
 
-DevSts::NegotiationScript TwoLegs() {
+DevSts::NegotiationScript TwoLegs(unsigned more) {
   DevSts::NegotiationScript script;
-  script.requestMic = true;
+  script.requestMic = kSignsMechanisms;
+  script.moreLegs = kSignsMechanisms ? more : more + 1;
   return script;
 }
 

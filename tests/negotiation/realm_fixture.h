@@ -19,8 +19,12 @@ namespace SsoClient::Testing {
 /// The name of the dev STS in the realm.
 inline constexpr char kTarget[] = "HTTP@sts.example";
 
-/// A negotiation of two legs.
-DevSts::NegotiationScript TwoLegs();
+/// Whether the Kerberos library answers a service that signs the list of mechanisms.
+inline constexpr bool kSignsMechanisms = SSOCLIENT_KERBEROS_SIGNS_MECHANISMS;
+
+/// A negotiation of two legs, then `more` of them. The second one is the signature of the list of
+/// mechanisms if the Kerberos library makes it, and empty otherwise.
+DevSts::NegotiationScript TwoLegs(unsigned more = 0);
 
 /// One Kerberos realm for all tests of the process, which belongs to it, and one dev STS with a key
 /// of that realm, well-behaved at the start of each test. In the realm, "alice" has a password,

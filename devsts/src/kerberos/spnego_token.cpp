@@ -79,19 +79,24 @@ View ResponseFields(const Octets& response) {
   return ContentOf(ContentOf(response, Field(1)), kSequence);
 }
 
-Octets Wrapped(unsigned char tag, View content) {
-  const std::size_t size = content.size();
-  Octets octets;
-  octets.reserve(size + 4);
-  octets.push_back(tag);
-  if (size >= 0x100) {
-    octets.push_back(0x82);
-    octets.push_back(static_cast<unsigned char>(size >> 8U));
-  } else if (size >= 0x80) {
-    octets.push_back(0x81);
+// X.690, section 8.1.3.
+Octets WrittenLength(std::size_t size) {
+  const auto low = static_cast<unsigned char>(size);
+  if (size < 0x80) {
+    return {low};
   }
-  octets.push_back(static_cast<unsigned char>(size));
-  std::copy(content.begin(), content.end(), std::back_inserter(octets));
+  if (size < 0x100) {
+    return {0x81, low};
+  }
+  return {0x82, static_cast<unsigned char>(size >> 8U), low};
+}
+
+Octets Wrapped(unsigned char tag, View content) {
+  const Octets length = WrittenLength(content.size());
+  Octets octets{tag};
+  octets.reserve(1 + length.size() + content.size());
+  octets.insert(octets.end(), length.begin(), length.end());
+  octets.insert(octets.end(), content.begin(), content.end());
   return octets;
 }
 

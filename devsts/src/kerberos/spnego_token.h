@@ -16,6 +16,7 @@ class SpnegoError : public std::runtime_error {
 };
 
 enum class NegState : unsigned char {
+  AcceptCompleted = 0,
   AcceptIncomplete = 1,
 };
 

@@ -8,6 +8,7 @@
 
 #include <tarnik/text/string_util.h>
 
+#include "ssl/tls_error_text.h"
 #include "support/openssl_error.h"
 #include "support/openssl_section.h"
 
@@ -20,9 +21,7 @@ int ToInt(std::size_t size) {
 
 // The earliest error is the cause of the later ones.
 std::string TakeReason() {
-  const unsigned long error = ERR_peek_error();
-  const char* reason = ERR_reason_error_string(error);
-  std::string text = reason == nullptr ? "unknown cause" : reason;
+  std::string text = TlsErrorText(ERR_peek_error());
   ERR_clear_error();
   return text;
 }

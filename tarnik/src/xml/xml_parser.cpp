@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <cstddef>
+#include <cstdint>
 #include <cstring>
 #include <exception>
 #include <limits>
@@ -20,6 +21,7 @@
 #include <tarnik/xml/xml_parse_exception.h>
 #include <tarnik/xml/xml_parser.h>
 
+#include "xml/expat_calls.h"
 #include "xml/expat_memory.h"
 
 namespace Tarnik::Xml {
@@ -32,15 +34,20 @@ static_assert(sizeof(XML_Char) == 1, "Expat must be built for UTF-8");
 constexpr std::size_t kFirstChunkBytes = std::size_t{7} * 1024;
 
 // Without a salt, Expat would request one from the system for each parser.
-unsigned long HashSalt() noexcept {
-  static const unsigned long salt = [] {
-    unsigned long value = 0;
-    if (getrandom(&value, sizeof(value), 0) != static_cast<ssize_t>(sizeof(value))) {
-      value = 0;  // Expat then generates one
-    }
-    return value;
+void SetSaltOf(XML_Parser parser) noexcept {
+  struct Salt {
+    std::uint8_t bytes[16];
+    bool isRandom;
+  };
+  static const Salt salt = [] {
+    Salt made{};
+    made.isRandom =
+        getrandom(made.bytes, sizeof(made.bytes), 0) == static_cast<ssize_t>(sizeof(made.bytes));
+    return made;
   }();
-  return salt;
+  if (salt.isRandom) {
+    SetHashSalt(parser, salt.bytes);
+  }
 }
 
 // Parses one document with Expat: passes its events to a handler and enforces the limits.
@@ -54,8 +61,8 @@ class ExpatSession {
   void ParseBuffer(std::size_t size, bool last);
 
  private:
-  static constexpr long kUnknown = -1;
-  static constexpr long kNoLineFeed = std::numeric_limits<long>::max();
+  static constexpr std::int64_t kUnknown = -1;
+  static constexpr std::int64_t kNoLineFeed = std::numeric_limits<std::int64_t>::max();
 
   struct Deleter {
     void operator()(XML_Parser parser) const noexcept { XML_ParserFree(parser); }
@@ -79,7 +86,7 @@ class ExpatSession {
   void CheckFirstBytes(const char* bytes, std::size_t size);
   // The position of the current event.
   const Position& Locate();
-  long FindLineFeed(long from, long current) const;
+  std::int64_t FindLineFeed(std::int64_t from, std::int64_t current) const;
   void ThrowSyntaxError();
 
   static XML_Parser CreateParser(ExpatMemory& memory);
@@ -93,17 +100,17 @@ class ExpatSession {
   std::vector<ParsedAttribute> attributes_;
   std::exception_ptr failure_;
   // Where the event before the current one begins.
-  long locatedByte_ = 0;
-  long lineStartByte_ = 0;
+  std::int64_t locatedByte_ = 0;
+  std::int64_t lineStartByte_ = 0;
   // The next line feed of the chunk, cached to avoid a search for each event.
-  long lineFeedByte_ = kUnknown;
+  std::int64_t lineFeedByte_ = kUnknown;
   Position located_{1, 1};
 };
 
 ExpatSession::ExpatSession(XMLHandler& handler)
     : handler_(handler), parser_(CreateParser(memory_)) {
   XML_Parser parser = parser_.get();
-  XML_SetHashSalt(parser, HashSalt());
+  SetSaltOf(parser);
   XML_SetUserData(parser, this);
   XML_SetXmlDeclHandler(parser, OnXmlDeclaration);
   XML_SetStartDoctypeDeclHandler(parser, OnDoctype);
@@ -172,7 +179,7 @@ void ExpatSession::CheckFirstBytes(const char* bytes, std::size_t size) {
 
 // Expat can compute the position itself, but scans each byte again for it.
 const Position& ExpatSession::Locate() {
-  const long byte = XML_GetCurrentByteIndex(parser_.get());
+  const std::int64_t byte = ByteIndex(parser_.get());
   if (byte <= locatedByte_) {
     return located_;
   }
@@ -190,15 +197,14 @@ const Position& ExpatSession::Locate() {
 }
 
 // The first line feed at or after `from` in Expat's buffer; `current` is the byte of the event.
-long ExpatSession::FindLineFeed(long from, long current) const {
-  int offset = 0;
-  int size = 0;
-  const char* buffer = XML_GetInputContext(parser_.get(), &offset, &size);
-  if (buffer == nullptr || current - from > offset) {
+std::int64_t ExpatSession::FindLineFeed(std::int64_t from, std::int64_t current) const {
+  const InputContext context = ContextOf(parser_.get());
+  if (context.bytes == nullptr || current - from > context.offset) {
     return kNoLineFeed;
   }
-  const char* start = buffer + offset - (current - from);
-  const void* found = std::memchr(start, '\n', static_cast<std::size_t>(buffer + size - start));
+  const std::int64_t offset = context.offset - (current - from);
+  const char* start = context.bytes + offset;
+  const void* found = std::memchr(start, '\n', context.size - static_cast<std::uint64_t>(offset));
   return found == nullptr ? kNoLineFeed : from + (static_cast<const char*>(found) - start);
 }
 

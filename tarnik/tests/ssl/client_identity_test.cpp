@@ -93,9 +93,10 @@ TEST_P(ClientIdentityTest, IsReportedAsMissingByAPeerThatRequiresIt) {
   TlsServer server(peer_, 1);
   EXPECT_EQ(Exchange(*CreateSSLContext(TrustingConfig(TestPki::Get().root)), server.Port()),
             GetParam() == TLS1_2_VERSION
-                ? "TLS handshake with sts.example failed: sslv3 alert handshake failure"
-                : "Cannot read from the TLS connection with sts.example: tlsv13 alert certificate "
-                  "required");
+                ? "TLS handshake with sts.example failed: " +
+                      SentAlert("handshake_failure", SSL_AD_HANDSHAKE_FAILURE)
+                : "Cannot read from the TLS connection with sts.example: " +
+                      SentAlert("certificate_required", SSL_AD_CERTIFICATE_REQUIRED));
   EXPECT_FALSE(server.Join()[0].accepted);
 }
 

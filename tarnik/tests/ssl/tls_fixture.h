@@ -4,6 +4,8 @@
 #include <string>
 
 #include <gtest/gtest.h>
+#include <openssl/err.h>
+#include <openssl/ssl.h>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/ssl/ssl_context.h>
@@ -41,6 +43,15 @@ inline Ssl::SSLContextConfig TrustingConfig(const Identity& ca) {
 
 inline Ref<Ssl::SSLContext> TrustingContext(const Identity& ca) {
   return Ssl::CreateSSLContext(TrustingConfig(ca));
+}
+
+/// How messages report an alert of the peer; OpenSSL's own words, in brackets, depend on its
+/// version.
+inline std::string SentAlert(const std::string& name, int alert) {
+  const char* reason =
+      ERR_reason_error_string(ERR_PACK(ERR_LIB_SSL, 0, SSL_AD_REASON_OFFSET + alert));
+  EXPECT_NE(reason, nullptr) << alert;
+  return "the peer sent the alert " + name + " (" + (reason == nullptr ? "" : reason) + ")";
 }
 
 /// A TLS stream over TCP to a port of the loopback interface; closed with its owner.
