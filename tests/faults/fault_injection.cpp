@@ -4,9 +4,12 @@
 #include <cstddef>
 #include <cstdlib>
 #include <new>
+#include <string_view>
+#include <system_error>
 
 #include <openssl/crypto.h>
 #include <openssl/evp.h>
+#include <pthread.h>
 
 extern "C" void* __real_malloc(std::size_t size);
 
@@ -32,12 +35,38 @@ bool Fails(FaultKind kind) noexcept {
   return true;
 }
 
+/// The kind of allocations that a thread of the pool makes.
+FaultKind KindOnThisThread() noexcept {
+  static constinit thread_local FaultKind kind = FaultKind::kAllocation;
+  static constinit thread_local bool isKnown = false;
+  // A thread has its name when it runs its first item.
+  if (!isKnown && plan.isArmed) {
+    isKnown = true;
+    char name[16] = "";
+    pthread_getname_np(pthread_self(), name, sizeof(name));
+    const std::string_view text = name;
+    kind = text == "tarnik-io"       ? FaultKind::kIoThreadAllocation
+           : text == "tarnik-worker" ? FaultKind::kWorkerAllocation
+                                     : FaultKind::kAllocation;
+  }
+  return kind;
+}
+
+bool FailsOnThisThread() noexcept {
+  const FaultKind kind = KindOnThisThread();
+  return kind != FaultKind::kAllocation && Fails(kind);
+}
+
 void* Allocate(std::size_t size) noexcept {
-  return isMemoryShort || Fails(FaultKind::kAllocation) ? nullptr : __real_malloc(size);
+  return isMemoryShort || Fails(FaultKind::kAllocation) || FailsOnThisThread()
+             ? nullptr
+             : __real_malloc(size);
 }
 
 void* AllocateInOpenSsl(std::size_t size, const char* /*file*/, int /*line*/) noexcept {
-  return size == 0 || Fails(FaultKind::kOpenSslAllocation) ? nullptr : __real_malloc(size);
+  return size == 0 || Fails(FaultKind::kOpenSslAllocation) || FailsOnThisThread()
+             ? nullptr
+             : __real_malloc(size);
 }
 
 void* ReallocateInOpenSsl(void* memory, std::size_t size, const char* /*file*/,
@@ -46,7 +75,8 @@ void* ReallocateInOpenSsl(void* memory, std::size_t size, const char* /*file*/,
     std::free(memory);
     return nullptr;
   }
-  return Fails(FaultKind::kOpenSslAllocation) ? nullptr : std::realloc(memory, size);
+  return Fails(FaultKind::kOpenSslAllocation) || FailsOnThisThread() ? nullptr
+                                                                     : std::realloc(memory, size);
 }
 
 void FreeInOpenSsl(void* memory, const char* /*file*/, int /*line*/) noexcept {
@@ -153,5 +183,18 @@ int __wrap_EVP_PKEY_sign(EVP_PKEY_CTX* context, unsigned char* signature,
   return SsoClient::Testing::Fails(SsoClient::Testing::FaultKind::kCrypto)
              ? SsoClient::Testing::plan.result
              : __real_EVP_PKEY_sign(context, signature, signatureSize, digest, digestSize);
+}
+
+// std::thread::_M_start_thread(std::unique_ptr<std::thread::_State>, void (*)()): this object and
+// the address of the first argument.
+void __real__ZNSt6thread15_M_start_threadESt10unique_ptrINS_6_StateESt14default_deleteIS1_EEPFvvE(
+    void* thread, void* state, void (*depend)());
+void __wrap__ZNSt6thread15_M_start_threadESt10unique_ptrINS_6_StateESt14default_deleteIS1_EEPFvvE(
+    void* thread, void* state, void (*depend)()) {
+  if (SsoClient::Testing::Fails(SsoClient::Testing::FaultKind::kThreadStart)) {
+    throw std::system_error(std::make_error_code(std::errc::resource_unavailable_try_again));
+  }
+  __real__ZNSt6thread15_M_start_threadESt10unique_ptrINS_6_StateESt14default_deleteIS1_EEPFvvE(
+      thread, state, depend);
 }
 }

@@ -9,7 +9,17 @@
 /// call may be on any thread.
 namespace SsoClient::Testing {
 
-enum class FaultKind { kAllocation, kOpenSslAllocation, kCrypto };
+enum class FaultKind {
+  kAllocation,
+  kOpenSslAllocation,
+  kCrypto,
+  /// An allocation, OpenSSL's included, on an I/O thread of the pool.
+  kIoThreadAllocation,
+  /// The same on a worker of the pool.
+  kWorkerAllocation,
+  /// The start of a thread.
+  kThreadStart,
+};
 
 /// During its lifetime the call of `kind` with this index (counted from 0) fails; a crypto call
 /// returns `result`.

@@ -37,8 +37,9 @@ TEST(ForkedChildTest, RunsEverythingInAChild) {
 }
 
 TEST(ForkedChildTest, RunsEverythingInAChildOfAChild) {
-  EXPECT_TRUE(HoldsInChild(
-      [] { return RunsItemsCompletionsAndTimers() && HoldsInChild(RunsItemsCompletionsAndTimers); }));
+  EXPECT_TRUE(HoldsInChild([] {
+    return RunsItemsCompletionsAndTimers() && HoldsInChild(RunsItemsCompletionsAndTimers);
+  }));
 }
 
 TEST(ForkedChildTest, HandleOfTheParentWorksInAChild) {
@@ -100,8 +101,7 @@ class SocketForkTest : public testing::Test {
   }
 
   const LoopbackListener listener_;
-  const Ref<System::TCPClientSocket> socket_ =
-      System::CreateTCPClientSocket(GetThreadPool().get());
+  const Ref<System::TCPClientSocket> socket_ = System::CreateTCPClientSocket(GetThreadPool().get());
   Descriptor peer_;
 };
 
