@@ -6,6 +6,8 @@
 
 #include <spdlog/sinks/stdout_sinks.h>
 
+#include "support/fork.h"
+
 namespace Tarnik::Service {
 
 /// A sink with the number of its calls that are under way. `sinkMutex_` guards all members but the
@@ -142,5 +144,18 @@ void LogRegistry::UnlockInChild() {
   }
   UnlockInParent();
 }
+
+namespace {
+
+// At load, so that no thread can be inside the initialisation of the registry while another forks.
+[[maybe_unused]] const bool kLogTakesPartInFork = [] {
+  LogRegistry::Get();
+  SetForkHooks(ForkOrder::kLog, {[]() noexcept { LogRegistry::Get().LockForFork(); },
+                                 []() noexcept { LogRegistry::Get().UnlockInParent(); },
+                                 []() noexcept { LogRegistry::Get().UnlockInChild(); }});
+  return true;
+}();
+
+}  // namespace
 
 }  // namespace Tarnik::Service

@@ -32,7 +32,7 @@ void UnlockAll() noexcept {
   }
 }
 
-[[maybe_unused]] const bool kTakesPartInFork =
+[[maybe_unused]] const bool kObjectLocksTakePartInFork =
     (SetForkHooks(ForkOrder::kObjects, {&LockAll, &UnlockAll, &UnlockAll}), true);
 
 }  // namespace

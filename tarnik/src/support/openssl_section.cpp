@@ -46,7 +46,7 @@ void StartAnew() noexcept {
   }
 }
 
-[[maybe_unused]] const bool kTakesPartInFork =
+[[maybe_unused]] const bool kSectionsTakePartInFork =
     (SetForkHooks(ForkOrder::kOpenSsl, {&WaitForSections, &ContinueSections, &StartAnew}), true);
 
 }  // namespace

@@ -25,7 +25,7 @@ void DropWatches() noexcept {
   watchesMutex.unlock();
 }
 
-[[maybe_unused]] const bool kTakesPartInFork =
+[[maybe_unused]] const bool kWatchesTakePartInFork =
     (SetForkHooks(ForkOrder::kWaits, {&LockWatches, &UnlockWatches, &DropWatches}), true);
 
 }  // namespace

@@ -45,7 +45,7 @@ class OpenSockets {
 };
 
 // At load, so that no thread can be inside the initialisation while another forks.
-[[maybe_unused]] const bool kTakesPartInFork = [] {
+[[maybe_unused]] const bool kSocketsTakePartInFork = [] {
   OpenSockets::Get();
   SetForkHooks(ForkOrder::kSockets, {[]() noexcept { OpenSockets::Get().Mutex().lock(); },
                                      []() noexcept { OpenSockets::Get().Mutex().unlock(); },

@@ -70,7 +70,7 @@ void RequireCallable(const std::function<void()>& function) {
 }
 
 // At load, so that no thread can be inside the initialisation of the pool while another forks.
-[[maybe_unused]] const bool kTakesPartInFork = [] {
+[[maybe_unused]] const bool kPoolTakesPartInFork = [] {
   ProcessThreadPool();
   SetForkHooks(ForkOrder::kThreadPool, {[]() noexcept { ProcessThreadPool().Lock(); },
                                         []() noexcept { ProcessThreadPool().Unlock(); },

@@ -4,8 +4,8 @@
 #include <thread>
 
 #include <gtest/gtest.h>
-#include <sys/wait.h>
-#include <unistd.h>
+
+#include "support/forked_child.h"
 
 namespace Tarnik::Testing {
 namespace {
@@ -25,22 +25,13 @@ TEST(LogRegistryTest, ChildForgetsTheCallsOfItsParent) {
   std::thread writer([&] { LogInternal(logger, 1, "line", {}); });
   entered.get_future().wait();
 
-  auto& registry = LogRegistry::Get();
-  registry.LockForFork();
-  const pid_t child = fork();
-  if (child == 0) {
-    alarm(20);
-    registry.UnlockInChild();
+  EXPECT_TRUE(HoldsInChild([&] {
     int lines = 0;
     SetLogSink([&lines](const LogRecord&) { ++lines; });
     SetLogLevel("LogRegistryTest.Fork", 1);
     LogInternal(logger, 1, "line", {});
-    _exit(lines == 1 ? 0 : 1);
-  }
-  registry.UnlockInParent();
-  int status = -1;
-  waitpid(child, &status, 0);
-  EXPECT_EQ(status, 0);
+    return lines == 1;
+  }));
 
   mayLeave.set_value();
   writer.join();
