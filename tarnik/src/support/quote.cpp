@@ -19,7 +19,14 @@ std::string Quote(std::string_view text) {
 }
 
 std::string QuoteVerbatim(std::string_view text) {
-  return "'" + std::string(text) + "'";
+  if (text.size() <= kMaxQuotedLength) {
+    return "'" + std::string(text) + "'";
+  }
+  std::size_t end = kMaxQuotedLength;
+  while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80) {
+    --end;  // within a character of UTF-8
+  }
+  return "'" + std::string(text.substr(0, end)) + "...'";
 }
 
 }  // namespace Tarnik

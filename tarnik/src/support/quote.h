@@ -10,7 +10,8 @@ namespace Tarnik {
 /// question marks in place of bytes that are not printable ASCII.
 std::string Quote(std::string_view text);
 
-/// `text` between apostrophes, unchanged. For names whose characters have been checked.
+/// `text` between apostrophes, cut after 120 bytes and at the start of a character, otherwise
+/// unchanged. For names in UTF-8 whose characters have been checked.
 std::string QuoteVerbatim(std::string_view text);
 
 }  // namespace Tarnik
