@@ -54,6 +54,7 @@ class FreshErrors {
     const char* function;
     std::string text;
   };
+  Section section_;
   std::vector<Saved> saved_;
 };
 
