@@ -14,6 +14,7 @@
 #include "core/copy_exception.h"
 #include "ssl/tls_engine.h"
 #include "support/fork.h"
+#include "system/connect_stage.h"
 #include "system/handler_memory.h"
 #include "system/host_name.h"
 #include "system/post_with.h"
@@ -72,6 +73,7 @@ class SSLStreamImpl final : public SSLStream, public ObjectImpl {
     bool close = false;
   };
 
+  std::string DescribePeer(const std::string& host) const;
   void RequireOwnProcess() const;
   void AdvanceSoon();
   void AdvanceNow();
@@ -136,13 +138,19 @@ void SSLStreamImpl::HandshakeClientAsync(const std::string& host, const std::str
     if (engine_ != nullptr) {
       throw InvalidStateException("The TLS handshake was started before.");
     }
-    engine_ = std::make_unique<TlsEngine>(context_, host, serverName);
+    engine_ = std::make_unique<TlsEngine>(context_, host, serverName, DescribePeer(host));
     handshake_ = std::move(completion);
     if (isClosed_) {
       failure_ = closedFailure_;
     }
   }
   AdvanceSoon();
+}
+
+// For messages: with the port if the stream below knows it.
+std::string SSLStreamImpl::DescribePeer(const std::string& host) const {
+  const auto* socket = dynamic_cast<const System::ConnectProgress*>(below_.get());
+  return socket == nullptr ? host : System::DescribeEndpoint(host, socket->Port());
 }
 
 void SSLStreamImpl::RequireOwnProcess() const {

@@ -45,9 +45,9 @@ TlsEngine* EngineOf(const SSL* ssl) {
 }  // namespace
 
 TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
-                     const std::string& serverName)
+                     const std::string& serverName, const std::string& peer)
     : context_(std::move(context)),
-      host_(host),
+      peer_(peer),
       sessionPeer_(StringUtil::ToLower(host) + '\n' + StringUtil::ToLower(serverName)),
       check_(host, serverName, context_->Pinned()),
       ssl_(SSL_new(context_->Get())) {
@@ -55,7 +55,7 @@ TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
   OpenSsl::OwnedBio input(BIO_new(BIO_s_mem()));
   OpenSsl::OwnedBio output(BIO_new(BIO_s_mem()));
   if (ssl_ == nullptr || input == nullptr || output == nullptr) {
-    throw SSLException(errors.Describe("Cannot set up TLS for " + host_));
+    throw SSLException(errors.Describe("Cannot set up TLS for " + peer_));
   }
   input_ = input.get();
   output_ = output.get();
@@ -162,12 +162,12 @@ void TlsEngine::FailAtEndOfInput() const {
   if (!isHandshakeDone_) {
     throw HandshakeError(notTls_ == nullptr ? "the peer closed the connection" : notTls_);
   }
-  throw SSLException("The TLS connection with " + host_ +
+  throw SSLException("The TLS connection with " + peer_ +
                      " was closed without close_notify: the data may be cut off.");
 }
 
 SSLException TlsEngine::HandshakeError(const std::string& cause) const {
-  return SSLException("TLS handshake with " + host_ + " failed: " + cause);
+  return SSLException("TLS handshake with " + peer_ + " failed: " + cause);
 }
 
 void TlsEngine::Fail(const std::string& operation) {
@@ -179,7 +179,7 @@ void TlsEngine::Fail(const std::string& operation) {
   if (!isHandshakeDone_) {
     throw HandshakeError(check_.Failure().empty() ? reason : check_.Failure());
   }
-  throw SSLException(operation + " the TLS connection with " + host_ + ": " + reason);
+  throw SSLException(operation + " the TLS connection with " + peer_ + ": " + reason);
 }
 
 void TlsEngine::InstallCallbacks(SSL_CTX* context) {

@@ -19,8 +19,9 @@ namespace Tarnik::Ssl {
 /// Used by one thread at a time; clears OpenSSL's error queue of that thread.
 class TlsEngine {
  public:
-  /// The peer must be `serverName`, or `host` if that is empty.
-  TlsEngine(Ref<SSLContextImpl> context, const std::string& host, const std::string& serverName);
+  /// The peer must be `serverName`, or `host` if that is empty. Messages name it as `peer`.
+  TlsEngine(Ref<SSLContextImpl> context, const std::string& host, const std::string& serverName,
+            const std::string& peer);
   ~TlsEngine();
   TlsEngine(const TlsEngine&) = delete;
   TlsEngine& operator=(const TlsEngine&) = delete;
@@ -55,7 +56,7 @@ class TlsEngine {
   [[noreturn]] void Fail(const std::string& operation);
 
   const Ref<SSLContextImpl> context_;
-  const std::string host_;
+  const std::string peer_;
   const std::string sessionPeer_;
   PeerCheck check_;
   OpenSsl::OwnedSsl ssl_;

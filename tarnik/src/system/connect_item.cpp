@@ -20,6 +20,7 @@ class ConnectItem final : public CancellableItem, public ConnectProgress, public
   ConnectStage Stage() const noexcept override {
     return progress_ == nullptr ? ConnectStage::kConnection : progress_->Stage();
   }
+  int Port() const noexcept override { return progress_ == nullptr ? 0 : progress_->Port(); }
   std::string ToString() const override { return "<CancellableItem>"; }
 
  private:

@@ -15,6 +15,8 @@ enum class ConnectStage {
 class ConnectProgress {
  public:
   virtual ConnectStage Stage() const noexcept = 0;
+  /// The port that is connected to; 0 before the connect.
+  virtual int Port() const noexcept = 0;
 
  protected:
   ConnectProgress() = default;

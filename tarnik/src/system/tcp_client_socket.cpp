@@ -50,6 +50,7 @@ class TCPClientSocketImpl final : public TCPClientSocket,
   void Close() noexcept override;
   std::string ToString() const override;
   ConnectStage Stage() const noexcept override;
+  int Port() const noexcept override { return port_; }
 
  private:
   enum class Phase { kNew, kLookingUp, kConnecting, kConnected, kFailed };
@@ -76,9 +77,10 @@ class TCPClientSocketImpl final : public TCPClientSocket,
   const ConnectRules rules_;
   mutable std::mutex mutex_;
   TCPSocket socket_;
-  // Both are set once, by `ConnectAsync`.
+  // All are set once, by `ConnectAsync`.
   std::string peer_ = "nobody";
   PeerFailures failures_{peer_};
+  std::atomic<int> port_ = 0;
   std::atomic<Phase> phase_ = Phase::kNew;  // written with the mutex held
   bool closed_ = false;
   ConnectCompletion connectCompletion_;
@@ -136,6 +138,7 @@ void TCPClientSocketImpl::ConnectAsync(const std::string& host, int port,
       throw InvalidStateException("The socket was already asked to connect.");
     }
     peer_.swap(peer);
+    port_ = port;
     failures_ = failures;
     connectCompletion_ = std::move(completion);
     if (closed_) {
