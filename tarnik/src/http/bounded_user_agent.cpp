@@ -4,6 +4,7 @@
 #include <condition_variable>
 #include <memory>
 #include <mutex>
+#include <new>
 #include <string>
 #include <utility>
 #include <vector>
@@ -15,6 +16,9 @@
 #include <tarnik/system/thread_pool.h>
 
 #include "core/copy_exception.h"
+#include "support/fork.h"
+#include "support/object_lock.h"
+#include "support/process_end.h"
 
 namespace Tarnik::Http {
 namespace {
@@ -28,8 +32,17 @@ class BoundedExchange final : public PendingRequestItem, public ObjectImpl {
   explicit BoundedExchange(UserAgent::Completion completion) : completion_(std::move(completion)) {}
 
   bool Cancel() override {
+    if (mark_.IsFromParent()) {
+      return false;
+    }
     const Ref<PendingRequestItem> inner = Inner();
     return inner != nullptr && inner->Cancel();
+  }
+
+  void RequireOwnProcess() const {
+    if (mark_.IsFromParent()) {
+      throw InvalidStateException("The request was begun in the parent process.");
+    }
   }
 
   Ref<PendingRequestItem> Inner() const {
@@ -41,22 +54,24 @@ class BoundedExchange final : public PendingRequestItem, public ObjectImpl {
     inner_ = inner;
   }
 
-  /// Ends the exchange without having begun it.
-  void Refuse(std::shared_ptr<Exception> failure) {
-    System::GetThreadPool()->Post([self = Ref<BoundedExchange>(this), failure] {
-      self->Complete(failure.get(), nullptr);
+  /// Ends the exchange without having begun it. Called once, before others know the exchange.
+  void Refuse(const Exception& failure) {
+    refusal_ = CopyException(failure);
+    System::GetThreadPool()->Post([self = Ref<BoundedExchange>(this)] {
+      self->Complete(self->refusal_.get(), nullptr);
       {
         const std::lock_guard lock(self->mutex_);
-        self->refusal_ = failure;
+        self->isRefused_ = true;
       }
       self->refused_.notify_all();
     });
   }
-  /// Waits until the completion of a refused exchange has run.
-  std::shared_ptr<Exception> WaitForRefusal() {
+  /// Waits until the completion of a refused exchange has run, or the process ends.
+  const Exception& WaitForRefusal() {
+    const ProcessEndWatch watch(mutex_, refused_);
     std::unique_lock lock(mutex_);
-    refused_.wait(lock, [this] { return refusal_ != nullptr; });
-    return refusal_;
+    refused_.wait(lock, [this] { return isRefused_ || HasProcessEndBegun(); });
+    return *refusal_;
   }
 
   void Complete(Exception* failure, ClientResponse* response) {
@@ -70,7 +85,9 @@ class BoundedExchange final : public PendingRequestItem, public ObjectImpl {
   mutable std::mutex mutex_;
   std::condition_variable refused_;
   Ref<PendingRequestItem> inner_;
-  std::shared_ptr<Exception> refusal_;
+  std::shared_ptr<Exception> refusal_;  // set once
+  bool isRefused_ = false;
+  const ForkMark mark_;
   UserAgent::Completion completion_;  // used once
 };
 
@@ -85,7 +102,7 @@ class CallLimitImpl final : public CallLimit, public ObjectImpl {
   void Cancel() override {
     std::vector<Ref<BoundedExchange>> underWay;
     {
-      const std::lock_guard lock(mutex_);
+      const std::lock_guard lock(ObjectLock(this));
       isCancelled_ = true;
       underWay.swap(underWay_);
     }
@@ -96,7 +113,7 @@ class CallLimitImpl final : public CallLimit, public ObjectImpl {
 
   /// False when the limit is cancelled already.
   bool Add(const Ref<BoundedExchange>& exchange) {
-    const std::lock_guard lock(mutex_);
+    const std::lock_guard lock(ObjectLock(this));
     if (isCancelled_) {
       return false;
     }
@@ -104,7 +121,7 @@ class CallLimitImpl final : public CallLimit, public ObjectImpl {
     return true;
   }
   void Remove(const Ref<BoundedExchange>& exchange) {
-    const std::lock_guard lock(mutex_);
+    const std::lock_guard lock(ObjectLock(this));
     std::erase(underWay_, exchange);
   }
 
@@ -127,17 +144,21 @@ class CallLimitImpl final : public CallLimit, public ObjectImpl {
 
   const Clock::time_point deadline_;
   std::atomic<bool> isCancelled_{false};
-  std::mutex mutex_;
-  std::vector<Ref<BoundedExchange>> underWay_;
+  std::vector<Ref<BoundedExchange>> underWay_;  // under `ObjectLock(this)`
 };
 
 // `failure` as the caller of a bounded agent sees it.
-std::shared_ptr<Exception> Translate(const CallLimitImpl& limit, const Exception& failure) {
-  if (dynamic_cast<const TimeoutException*>(&failure) != nullptr && limit.HasPassed()) {
+std::shared_ptr<Exception> Translate(const CallLimitImpl& limit,
+                                     const Exception& failure) noexcept {
+  if (dynamic_cast<const TimeoutException*>(&failure) == nullptr || !limit.HasPassed()) {
+    return CopyException(failure);
+  }
+  try {
     return std::make_shared<TimeoutException>(std::string(kDeadlinePassed) + " " +
                                               failure.Message());
+  } catch (const std::bad_alloc&) {
+    return CopyException(failure);
   }
-  return CopyException(failure);
 }
 
 class BoundedUserAgent final : public UserAgent, public ObjectImpl {
@@ -152,12 +173,12 @@ class BoundedUserAgent final : public UserAgent, public ObjectImpl {
     }
     const auto exchange = MakeRef<BoundedExchange>(std::move(completion));
     if (!limit_->Add(exchange)) {
-      exchange->Refuse(std::make_shared<CancelledException>(kCancelled));
+      exchange->Refuse(CancelledException(kCancelled));
       return exchange;
     }
     if (limit_->HasPassed()) {
       limit_->Remove(exchange);
-      exchange->Refuse(std::make_shared<TimeoutException>(kDeadlinePassed));
+      exchange->Refuse(TimeoutException(kDeadlinePassed));
       return exchange;
     }
     Begin(request, exchange, timeoutMicroseconds);
@@ -166,19 +187,16 @@ class BoundedUserAgent final : public UserAgent, public ObjectImpl {
 
   Ref<ClientResponse> Wait(PendingRequestItem* item, unsigned long timeoutMicroseconds) override {
     const Ref<BoundedExchange> exchange(CheckedCast<BoundedExchange>(item));
+    exchange->RequireOwnProcess();
     const Ref<PendingRequestItem> innerItem = exchange->Inner();
-    std::shared_ptr<Exception> failure;
     if (innerItem == nullptr) {
-      failure = exchange->WaitForRefusal();
-    } else {
-      try {
-        return inner_->Wait(innerItem.get(), limit_->Shorten(timeoutMicroseconds));
-      } catch (const TimeoutException& timeout) {
-        failure = Translate(*limit_, timeout);
-      }
+      exchange->WaitForRefusal().Throw();
     }
-    failure->Throw();
-    return nullptr;
+    try {
+      return inner_->Wait(innerItem.get(), limit_->Shorten(timeoutMicroseconds));
+    } catch (const TimeoutException& timeout) {
+      Translate(*limit_, timeout)->Throw();
+    }
   }
 
  private:
