@@ -24,6 +24,8 @@ class PassByRefHelper {
   T* object_;
 };
 
+inline constexpr char kProcessIsEnding[] = "The operation was not started: the process is ending.";
+
 /// Runs `operation` on a worker thread of the platform's pool and returns immediately. `callback`
 /// then receives the result and null, or an empty result and the platform exception that the
 /// operation threw, which is valid only during the call. It receives a `ResourceException` when
@@ -40,7 +42,7 @@ void SyncToAsyncCall(std::function<Result()> operation,
     throw Tarnik::InvalidArgumentException("The callback must not be empty.");
   }
   if (Tarnik::System::IsProcessEnding()) {
-    throw CommunicationException("The operation was not started: the process is ending.");
+    throw CommunicationException(kProcessIsEnding);
   }
   const auto report = std::make_shared<const decltype(callback)>(std::move(callback));
   const auto pool = Tarnik::System::GetThreadPool();
@@ -58,6 +60,8 @@ void SyncToAsyncCall(std::function<Result()> operation,
       }
       (*report)(result, nullptr);
     });
+  } catch (const Tarnik::InvalidStateException&) {
+    throw CommunicationException(kProcessIsEnding);
   } catch (const Tarnik::ResourceException& error) {
     pool->Post([report, error] { (*report)(Result{}, &error); });
   }

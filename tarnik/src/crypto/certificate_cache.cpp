@@ -53,4 +53,11 @@ CertificateCache& ProcessCertificateCache() {
   return *cache;
 }
 
+namespace {
+
+// At load, so that no thread can be inside the initialisation while another forks.
+[[maybe_unused]] const bool kHasCertificateCacheAtLoad = (ProcessCertificateCache(), true);
+
+}  // namespace
+
 }  // namespace Tarnik::Crypto

@@ -57,6 +57,9 @@ class BoundedExchange final : public PendingRequestItem, public ObjectImpl {
   /// Ends the exchange without having begun it. Called once, before others know the exchange.
   void Refuse(const Exception& failure) {
     refusal_ = CopyException(failure);
+    if (HasProcessEndBegun()) {
+      return;
+    }
     System::GetThreadPool()->Post([self = Ref<BoundedExchange>(this)] {
       self->Complete(self->refusal_.get(), nullptr);
       {
@@ -192,15 +195,22 @@ class BoundedUserAgent final : public UserAgent, public ObjectImpl {
     if (innerItem == nullptr) {
       exchange->WaitForRefusal().Throw();
     }
-    try {
-      return inner_->Wait(innerItem.get(), limit_->Shorten(timeoutMicroseconds));
-    } catch (const TimeoutException& timeout) {
-      Translate(*limit_, timeout)->Throw();
-    }
+    return WaitFor(innerItem.get(), limit_->Shorten(timeoutMicroseconds));
   }
 
  private:
   ~BoundedUserAgent() override = default;
+
+  Ref<ClientResponse> WaitFor(PendingRequestItem* innerItem, unsigned long timeoutMicroseconds) {
+    std::shared_ptr<Exception> failure;
+    try {
+      return inner_->Wait(innerItem, timeoutMicroseconds);
+    } catch (const TimeoutException& timeout) {
+      failure = Translate(*limit_, timeout);
+    }
+    failure->Throw();
+    return nullptr;
+  }
 
   void Begin(ClientRequest* request, const Ref<BoundedExchange>& exchange,
              unsigned long timeoutMicroseconds) {

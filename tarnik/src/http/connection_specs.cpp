@@ -85,19 +85,21 @@ class TlsConnectionSpec final : public TcpConnectionSpec {
  private:
   ~TlsConnectionSpec() override = default;
 
+  static System::Stream* AsStream(System::Stream* socket) { return socket; }
+
   // Runs on an I/O thread, which no exception may leave.
   void StartHandshake(TCPClientSocket* socket, const ConnectCompletion& completion) const {
+    Ref<Ssl::SSLStream> stream;
     try {
-      const Ref<Ssl::SSLStream> stream = sslContext_->WrapStream(socket, "");
+      stream = sslContext_->WrapStream(socket, "");
       stream->HandshakeClientAsync(Host(), serverName_, [completion, stream](Exception* error) {
         completion(stream.get(), error);
       });
     } catch (Exception& refusal) {
-      completion(socket, &refusal);
-    } catch (const std::exception& failure) {
-      IOException refusal("Cannot begin the TLS handshake with " + EndpointKey() + ": " +
-                          failure.what());
-      completion(socket, &refusal);
+      completion(stream == nullptr ? AsStream(socket) : stream.get(), &refusal);
+    } catch (const std::bad_alloc&) {
+      ResourceException failure(OutOfMemory());
+      completion(stream == nullptr ? AsStream(socket) : stream.get(), &failure);
     }
   }
 

@@ -17,6 +17,9 @@
 namespace Tarnik::Http {
 namespace {
 
+// As long as process exit waits for completions.
+constexpr std::chrono::milliseconds kLimitAtProcessEnd{200};
+
 std::string DurationText(unsigned long microseconds) {
   constexpr unsigned long kPerSecond = 1000000;
   constexpr unsigned long kPerMillisecond = 1000;
@@ -256,13 +259,20 @@ void Exchange::TakeOverAnswer(const ClientResponseImpl& response, const PendingW
                               bool mayReuse) {
   try {
     origin_.StoreCookies(response, work.connection->IsSecure());
-  } catch (const std::bad_alloc&) {
+  } catch (const Exception& failure) {
     // An answer without its cookies must not count as a success.
     mayReuse = false;
-    const std::lock_guard guard(mutex_);
-    outcome_ = {CopyException(OutOfMemory()), nullptr};
+    SetFailure(failure);
+  } catch (const std::bad_alloc&) {
+    mayReuse = false;
+    SetFailure(OutOfMemory());
   }
   Release(work, mayReuse);
+}
+
+void Exchange::SetFailure(const Exception& failure) noexcept {
+  const std::lock_guard guard(mutex_);
+  outcome_ = {CopyException(failure), nullptr};
 }
 
 bool Exchange::HasEnded() {
@@ -301,6 +311,8 @@ Ref<ClientResponse> Exchange::Wait(unsigned long timeoutMicroseconds) {
     lock.unlock();
     EndWithProcess();
     lock.lock();
+    // A completion that is running may refer to objects of the waiting thread.
+    deliveredSignal_.wait_for(lock, kLimitAtProcessEnd, [this] { return isDelivered_; });
   }
   if (outcome_.failure != nullptr) {
     outcome_.failure->Throw();
@@ -337,6 +349,7 @@ bool Exchange::FailLater(std::shared_ptr<Exception> failure) {
 }
 
 void Exchange::EndWithProcess() {
+  UserAgent::Completion dropped;
   const auto work = Settle({MakeFailure([&] {
                               return CancelledException("The request to " + endpoint_.key +
                                                         " was cancelled: the process is ending.");
@@ -345,6 +358,10 @@ void Exchange::EndWithProcess() {
   if (work) {
     Release(*work, false);
   }
+  const std::lock_guard guard(mutex_);
+  dropped.swap(completion_);
+  // Empty when the completion has begun.
+  isDelivered_ = isDelivered_ || dropped;
 }
 
 TimeoutException Exchange::NoAnswer(unsigned long microseconds) {
@@ -398,6 +415,9 @@ void Exchange::Deliver() noexcept {
   {
     const std::lock_guard guard(mutex_);
     completion.swap(completion_);
+  }
+  if (!completion) {
+    return;  // dropped when the process ended
   }
   completion(outcome_.failure.get(), outcome_.response.get(), this);
   // What the completion captured is destroyed before a waiting thread continues, since that thread

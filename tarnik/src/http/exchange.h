@@ -89,8 +89,9 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   /// Ends with `failure` on any thread; the completion runs later. False when the exchange had
   /// already ended.
   bool FailLater(std::shared_ptr<Exception> failure);
-  /// Ends without the completion, since the threads that would run it have stopped.
+  /// Ends without the completion, unless it has begun: the threads that would run it stop.
   void EndWithProcess();
+  void SetFailure(const Exception& failure) noexcept;
   /// The failure after the time limit; says what the exchange is waiting for.
   TimeoutException NoAnswer(unsigned long microseconds);
   const char* DescribeStage();

@@ -58,8 +58,8 @@ class IdleConnections final : public std::enable_shared_from_this<IdleConnection
   /// Closes the connection of a removed entry. Called without the lock.
   static void Discard(const Entry& entry) noexcept;
 
-  /// Removes the connections of a parent process. Called first by every function that takes the
-  /// lock; returns them, to be released without it.
+  /// Removes the connections of a parent process with the lock held, and returns them, to be
+  /// released without it.
   std::vector<Entry> ForgetParent();
   std::uint64_t NextId();
   void Drop(std::uint64_t id);

@@ -23,6 +23,7 @@ void SessionCache::Put(const std::string& peer, OpenSsl::OwnedSslSession session
   if (SSL_SESSION_is_resumable(session.get()) == 0) {
     return;
   }
+  const OpenSsl::Section section;  // sessions are freed with the lock held
   const std::lock_guard lock(ObjectLock(this));
   ForgetParent();
   entries_.push_front({peer, std::move(session), now});
@@ -37,6 +38,7 @@ void SessionCache::Put(const std::string& peer, OpenSsl::OwnedSslSession session
 }
 
 OpenSsl::OwnedSslSession SessionCache::Take(const std::string& peer, Clock::time_point now) {
+  const OpenSsl::Section section;  // sessions are freed with the lock held
   const std::lock_guard lock(ObjectLock(this));
   ForgetParent();
   entries_.remove_if([now](const Entry& entry) {

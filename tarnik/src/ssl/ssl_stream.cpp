@@ -195,6 +195,7 @@ void SSLStreamImpl::Close() noexcept {
   if (mark_.IsFromParent()) {
     return;
   }
+  bool isStarted = false;
   {
     const std::lock_guard lock(mutex_);
     if (isClosed_) {
@@ -202,9 +203,12 @@ void SSLStreamImpl::Close() noexcept {
     }
     isClosed_ = true;
     failure_ = closedFailure_;
+    isStarted = engine_ != nullptr;
   }
   below_->Close();
-  AdvanceSoon();
+  if (isStarted) {
+    AdvanceSoon();
+  }
 }
 
 void SSLStreamImpl::AdvanceSoon() {

@@ -49,9 +49,9 @@ TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
     : context_(std::move(context)),
       peer_(peer),
       sessionPeer_(StringUtil::ToLower(host) + '\n' + StringUtil::ToLower(serverName)),
-      check_(host, serverName, context_->Pinned()),
-      ssl_(SSL_new(context_->Get())) {
+      check_(host, serverName, context_->Pinned()) {
   const OpenSsl::ErrorScope errors;
+  ssl_.reset(SSL_new(context_->Get()));
   OpenSsl::OwnedBio input(BIO_new(BIO_s_mem()));
   OpenSsl::OwnedBio output(BIO_new(BIO_s_mem()));
   if (ssl_ == nullptr || input == nullptr || output == nullptr) {
@@ -68,13 +68,11 @@ TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
 }
 
 TlsEngine::~TlsEngine() {
-  const OpenSsl::Section section;
   if (isHandshakeDone_ && !hasFailed_) {
     // OpenSSL does not resume the session of a connection that was not shut down. This one did not
     // fail; it was only closed without close_notify.
     SSL_set_shutdown(ssl_.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
   }
-  ssl_.reset();
 }
 
 void TlsEngine::Resume() {

@@ -13,13 +13,16 @@
 #include <openssl/x509.h>
 #include <openssl/x509v3.h>
 
+#include "support/openssl_section.h"
+
 namespace Tarnik::OpenSsl {
 
-/// Frees an object with the OpenSSL function `Function`.
+/// Frees an object with the OpenSSL function `Function`. Freeing takes locks of OpenSSL too.
 template <auto Function>
 struct Free {
   template <class T>
   void operator()(T* object) const noexcept {
+    const Section section;
     Function(object);
   }
 };
@@ -30,6 +33,7 @@ struct FreeMemory {
 
 struct FreeCertificates {
   void operator()(STACK_OF(X509) * certificates) const noexcept {
+    const Section section;
     sk_X509_pop_free(certificates, X509_free);
   }
 };

@@ -163,6 +163,8 @@ void TCPClientSocketImpl::StartLookUp(const std::string& host, int port) {
     } else {
       pool_->RunLookup(std::move(lookUp));
     }
+  } catch (const std::bad_alloc&) {
+    EndLookUp({});
   } catch (const std::exception&) {
     // This may be an I/O thread, and the caller expects failures in the completion.
     EndLookUp(NoLookUpThread());

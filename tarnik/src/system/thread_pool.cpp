@@ -113,7 +113,8 @@ PoolCore& ThreadPoolImpl::Core() {
 }
 
 PoolCore& ThreadPoolImpl::StartCore() {
-  // Exit handlers run in reverse order: the one that is registered below runs before OpenSSL's.
+  // Exit handlers run in reverse order: the one that is registered below runs before OpenSSL's, if
+  // the host program has initialised OpenSSL with one.
   OpenSsl::Initialise();
   const std::lock_guard lock(mutex_);
   if (PoolCore* const started = core_.load(std::memory_order_acquire)) {

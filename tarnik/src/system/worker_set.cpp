@@ -23,6 +23,8 @@ WorkerSet::~WorkerSet() {
 }
 
 void WorkerSet::Run(std::function<void()> item) {
+  // Destroyed after the lock is released, since destructors of its captures may call `Run`.
+  std::function<void()> refused;
   const std::lock_guard lock(mutex_);
   items_.push_back(std::move(item));
   if (phase_ != Phase::kRunning) {
@@ -39,6 +41,7 @@ void WorkerSet::Run(std::function<void()> item) {
   } catch (...) {
     // With another worker the item runs later; without one it would never run.
     if (workers_ == 0) {
+      refused.swap(items_.back());
       items_.pop_back();
       throw;
     }

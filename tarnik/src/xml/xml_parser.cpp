@@ -33,18 +33,27 @@ static_assert(sizeof(XML_Char) == 1, "Expat must be built for UTF-8");
 // The size of a usual security token. Expat adds 1 KiB and rounds up to a power of two.
 constexpr std::size_t kFirstChunkBytes = std::size_t{7} * 1024;
 
-// Without a salt, Expat would request one from the system for each parser.
-void SetSaltOf(XML_Parser parser) noexcept {
-  struct Salt {
-    std::uint8_t bytes[16];
-    bool isRandom;
-  };
+struct Salt {
+  std::uint8_t bytes[16];
+  bool isRandom;
+};
+
+const Salt& SaltOfProcess() noexcept {
   static const Salt salt = [] {
     Salt made{};
     made.isRandom =
         getrandom(made.bytes, sizeof(made.bytes), 0) == static_cast<ssize_t>(sizeof(made.bytes));
     return made;
   }();
+  return salt;
+}
+
+// At load, so that no thread can be inside the initialisation while another forks.
+[[maybe_unused]] const bool kHasSaltAtLoad = (SaltOfProcess(), true);
+
+// Without a salt, Expat would request one from the system for each parser.
+void SetSaltOf(XML_Parser parser) noexcept {
+  const Salt& salt = SaltOfProcess();
   if (salt.isRandom) {
     SetHashSalt(parser, salt.bytes);
   }

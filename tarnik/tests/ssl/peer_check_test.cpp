@@ -55,8 +55,8 @@ TEST_P(PeerCheckNameTest, ComparesTheExpectedPeerWithTheCertificate) {
   options.dnsNames = nameCase.dnsNames;
   options.addresses = nameCase.addresses;
   const std::string refusal = "TLS handshake with " + nameCase.host +
-                              " failed: the certificate (CN=leaf) does not name '" + nameCase.host +
-                              "'";
+                              ":PORT failed: the certificate (CN=leaf) does not name '" +
+                              nameCase.host + "'";
   EXPECT_EQ(HandshakeWith(options, nameCase.host), nameCase.isAccepted ? "" : refusal);
 }
 
@@ -95,16 +95,18 @@ TEST(PeerCheckTest, IgnoresTheCommonName) {
   IdentityOptions options;
   options.commonName = "sts.example";
   options.dnsNames = {};
-  EXPECT_EQ(HandshakeWith(options, "sts.example"),
-            "TLS handshake with sts.example failed: the certificate (CN=sts.example) does not name "
-            "'sts.example'");
+  EXPECT_EQ(
+      HandshakeWith(options, "sts.example"),
+      "TLS handshake with sts.example:PORT failed: the certificate (CN=sts.example) does not name "
+      "'sts.example'");
 }
 
 TEST(PeerCheckTest, PrefersTheServerNameToTheHost) {
   EXPECT_EQ(HandshakeWith({}, "10.0.0.1", "sts.example"), "");
-  EXPECT_EQ(HandshakeWith({}, "sts.example", "other.example"),
-            "TLS handshake with sts.example failed: the certificate (CN=sts.example) does not name "
-            "'other.example'");
+  EXPECT_EQ(
+      HandshakeWith({}, "sts.example", "other.example"),
+      "TLS handshake with sts.example:PORT failed: the certificate (CN=sts.example) does not name "
+      "'other.example'");
 }
 
 TEST(PeerCheckTest, AcceptsANameWithATrailingDot) {
@@ -115,9 +117,10 @@ TEST(PeerCheckTest, EscapesTheNamesThatAPeerChooses) {
   IdentityOptions options;
   options.commonName = "a\r\nb\x01 \"";
   options.dnsNames = {};
-  EXPECT_EQ(HandshakeWith(options, "sts.example"),
-            "TLS handshake with sts.example failed: the certificate (CN=a\\0D\\0Ab\\01 \\\") does "
-            "not name 'sts.example'");
+  EXPECT_EQ(
+      HandshakeWith(options, "sts.example"),
+      "TLS handshake with sts.example:PORT failed: the certificate (CN=a\\0D\\0Ab\\01 \\\") does "
+      "not name 'sts.example'");
 }
 
 struct DateCase {
@@ -132,9 +135,9 @@ TEST(PeerCheckTest, RefusesCertificatesOutsideTheirValidity) {
     IdentityOptions options;
     options.notBefore = dates.notBefore;
     options.notAfter = dates.notAfter;
-    EXPECT_EQ(
-        HandshakeWith(options, "sts.example"),
-        std::string("TLS handshake with sts.example failed: ") + dates.cause + " (CN=sts.example)");
+    EXPECT_EQ(HandshakeWith(options, "sts.example"),
+              std::string("TLS handshake with sts.example:PORT failed: ") + dates.cause +
+                  " (CN=sts.example)");
   }
 }
 
@@ -142,7 +145,7 @@ TEST(PeerCheckTest, RefusesACertificateForClientsOnly) {
   IdentityOptions options;
   options.extendedKeyUsage = "clientAuth";
   EXPECT_THAT(HandshakeWith(options, "sts.example"),
-              testing::MatchesRegex("TLS handshake with sts.example failed: .*purpose.*"));
+              testing::MatchesRegex("TLS handshake with sts.example:PORT failed: .*purpose.*"));
   options.extendedKeyUsage = "serverAuth";
   EXPECT_EQ(HandshakeWith(options, "sts.example"), "");
 }
@@ -181,12 +184,14 @@ TEST(PeerCheckTest, AcceptsOnlyAPinnedCertificate) {
   const Identity other = MakeIdentity({}, &TestPki::Get().root);
   EXPECT_EQ(HandshakeWithPins({&TestPki::Get().leaf}), "");
   EXPECT_EQ(HandshakeWithPins({&other, &TestPki::Get().leaf}), "");
-  EXPECT_EQ(HandshakeWithPins({&other}),
-            "TLS handshake with sts.example failed: the certificate (CN=sts.example) is not one of "
-            "the pinned certificates");
-  EXPECT_EQ(HandshakeWithPins({&TestPki::Get().root}),
-            "TLS handshake with sts.example failed: the certificate (CN=sts.example) is not one of "
-            "the pinned certificates");
+  EXPECT_EQ(
+      HandshakeWithPins({&other}),
+      "TLS handshake with sts.example:PORT failed: the certificate (CN=sts.example) is not one of "
+      "the pinned certificates");
+  EXPECT_EQ(
+      HandshakeWithPins({&TestPki::Get().root}),
+      "TLS handshake with sts.example:PORT failed: the certificate (CN=sts.example) is not one of "
+      "the pinned certificates");
 }
 
 TEST(PeerCheckTest, DoesNotTrustACertificateOnlyBecauseItIsPinned) {
@@ -197,7 +202,7 @@ TEST(PeerCheckTest, DoesNotTrustACertificateOnlyBecauseItIsPinned) {
   peer.identity = &selfSigned;
   TlsServer server(peer, 1);
   EXPECT_EQ(TlsClient(*CreateSSLContext(config), server.Port()).Message(),
-            "TLS handshake with sts.example failed: self-signed certificate (CN=sts.example)");
+            "TLS handshake with sts.example:PORT failed: self-signed certificate (CN=sts.example)");
 }
 
 }  // namespace

@@ -19,7 +19,7 @@ namespace {
 using namespace Tarnik::Ssl;
 
 constexpr const char* kRevoked =
-    "TLS handshake with sts.example failed: certificate revoked (CN=sts.example)";
+    "TLS handshake with sts.example:PORT failed: certificate revoked (CN=sts.example)";
 
 TlsPeerOptions LeafPeer() {
   TlsPeerOptions peer;
@@ -47,16 +47,16 @@ TEST(RevocationTest, RefusesARevokedPeer) {
   const Identity& leaf = TestPki::Get().leaf;
   EXPECT_EQ(HandshakeWithCrls({MakeCrl(root, nullptr)}, LeafPeer()), "");
   EXPECT_EQ(HandshakeWithCrls({MakeCrl(root, &leaf)}, LeafPeer()),
-            "TLS handshake with sts.example failed: certificate revoked (CN=sts.example)");
+            "TLS handshake with sts.example:PORT failed: certificate revoked (CN=sts.example)");
 }
 
 TEST(RevocationTest, RefusesAPeerWhoseRevocationListIsMissingOrExpired) {
   const Identity stranger = MakeCa("Stranger");
   EXPECT_EQ(HandshakeWithCrls({MakeCrl(stranger, nullptr)}, LeafPeer()),
-            "TLS handshake with sts.example failed: unable to get certificate CRL "
+            "TLS handshake with sts.example:PORT failed: unable to get certificate CRL "
             "(CN=sts.example)");
   EXPECT_EQ(HandshakeWithCrls({MakeCrl(TestPki::Get().root, nullptr, -60)}, LeafPeer()),
-            "TLS handshake with sts.example failed: CRL has expired (CN=sts.example)");
+            "TLS handshake with sts.example:PORT failed: CRL has expired (CN=sts.example)");
 }
 
 TEST(RevocationTest, ChecksTheWholeChainForRevocation) {
@@ -69,9 +69,9 @@ TEST(RevocationTest, ChecksTheWholeChainForRevocation) {
   const std::string ofIntermediate = MakeCrl(intermediate, nullptr);
   EXPECT_EQ(HandshakeWithCrls({ofIntermediate, MakeCrl(root, nullptr)}, peer), "");
   EXPECT_EQ(HandshakeWithCrls({ofIntermediate, MakeCrl(root, &intermediate)}, peer),
-            "TLS handshake with sts.example failed: certificate revoked (CN=Intermediate)");
+            "TLS handshake with sts.example:PORT failed: certificate revoked (CN=Intermediate)");
   EXPECT_EQ(HandshakeWithCrls({ofIntermediate}, peer),
-            "TLS handshake with sts.example failed: unable to get certificate CRL "
+            "TLS handshake with sts.example:PORT failed: unable to get certificate CRL "
             "(CN=Intermediate)");
 }
 

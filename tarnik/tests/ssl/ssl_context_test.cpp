@@ -38,7 +38,7 @@ TEST(SSLContextTest, RefusesAPeerOfAnOlderProtocol) {
   peer.maxVersion = TLS1_1_VERSION;
   peer.ciphers = "ALL";
   peer.securityLevel = 0;
-  EXPECT_EQ(HandshakeWithLeaf(peer), "TLS handshake with sts.example failed: " +
+  EXPECT_EQ(HandshakeWithLeaf(peer), "TLS handshake with sts.example:PORT failed: " +
                                          SentAlert("protocol_version", SSL_AD_PROTOCOL_VERSION));
 }
 
@@ -48,7 +48,7 @@ struct CipherCase {
 };
 
 TEST(SSLContextTest, OffersNoWeakSuites) {
-  const std::string refusal = "TLS handshake with sts.example failed: " +
+  const std::string refusal = "TLS handshake with sts.example:PORT failed: " +
                               SentAlert("handshake_failure", SSL_AD_HANDSHAKE_FAILURE);
   for (const CipherCase& suite : {CipherCase{"aNULL", refusal}, CipherCase{"eNULL", refusal},
                                   CipherCase{"ECDHE-ECDSA-AES128-GCM-SHA256", ""}}) {
@@ -65,7 +65,7 @@ TEST(SSLContextTest, OffersNoWeakSuites) {
 TEST(SSLContextTest, RefusesAPeerWithAShortKey) {
   for (const auto& [bits, message] :
        {std::pair{1024U,
-                  "TLS handshake with sts.example failed: EE certificate key too weak "
+                  "TLS handshake with sts.example:PORT failed: EE certificate key too weak "
                   "(CN=sts.example)"},
         std::pair{2048U, ""}}) {
     IdentityOptions options;

@@ -59,7 +59,7 @@ class TlsClient {
  public:
   TlsClient(Ssl::SSLContext& context, int port, const std::string& host = "sts.example",
             const std::string& serverName = "")
-      : socket_(System::CreateTCPClientSocket(System::GetThreadPool().get())) {
+      : socket_(System::CreateTCPClientSocket(System::GetThreadPool().get())), port_(port) {
     const Outcome connected;
     socket_->ConnectAsync("127.0.0.1", port, [connected](System::TCPClientSocket*, Exception* e) {
       connected.Report(e);
@@ -75,7 +75,13 @@ class TlsClient {
   TlsClient& operator=(const TlsClient&) = delete;
 
   /// Empty when the handshake has succeeded.
-  std::string Message() const { return handshake_.Message(); }
+  std::string Message() const { return WithoutPort(handshake_.Message()); }
+  /// `message` with "PORT" in place of the number of the port.
+  std::string WithoutPort(std::string message) const {
+    const std::string port = ":" + std::to_string(port_);
+    const auto found = message.find(port);
+    return found == std::string::npos ? message : message.replace(found, port.size(), ":PORT");
+  }
   const Outcome& Handshake() const { return handshake_; }
   Ssl::SSLStream& Stream() const { return *stream_; }
 
@@ -83,6 +89,7 @@ class TlsClient {
   Ref<System::TCPClientSocket> socket_;
   Ref<Ssl::SSLStream> stream_;
   Outcome handshake_;
+  int port_;
 };
 
 }  // namespace Tarnik::Testing

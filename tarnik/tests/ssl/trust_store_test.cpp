@@ -37,7 +37,7 @@ std::string MessageOf(const SSLContextConfig& config) {
 
 TEST(TrustStoreTest, TrustsNoPeerByDefault) {
   EXPECT_EQ(Handshake({}, LeafPeer()),
-            "TLS handshake with sts.example failed: unable to get local issuer certificate "
+            "TLS handshake with sts.example:PORT failed: unable to get local issuer certificate "
             "(CN=sts.example, issued by CN=Root)");
 }
 
@@ -47,7 +47,7 @@ TEST(TrustStoreTest, RefusesASelfSignedPeer) {
   peer.identity = &selfSigned;
   const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   EXPECT_EQ(Handshake(config, peer),
-            "TLS handshake with sts.example failed: self-signed certificate (CN=sts.example)");
+            "TLS handshake with sts.example:PORT failed: self-signed certificate (CN=sts.example)");
 }
 
 TEST(TrustStoreTest, DoesNotTrustARootSentByThePeer) {
@@ -57,9 +57,10 @@ TEST(TrustStoreTest, DoesNotTrustARootSentByThePeer) {
   peer.identity = &leaf;
   peer.chain = {&stranger};
   const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
-  EXPECT_EQ(Handshake(config, peer),
-            "TLS handshake with sts.example failed: self-signed certificate in certificate chain "
-            "(CN=Stranger)");
+  EXPECT_EQ(
+      Handshake(config, peer),
+      "TLS handshake with sts.example:PORT failed: self-signed certificate in certificate chain "
+      "(CN=Stranger)");
 }
 
 TEST(TrustStoreTest, RefusesAForgedRootOfTheSameName) {
@@ -77,7 +78,7 @@ TEST(TrustStoreTest, NeedsTheIntermediateCertificateFromThePeer) {
   peer.identity = &leaf;
   const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
   EXPECT_EQ(Handshake(config, peer),
-            "TLS handshake with sts.example failed: unable to get local issuer certificate "
+            "TLS handshake with sts.example:PORT failed: unable to get local issuer certificate "
             "(CN=sts.example, issued by CN=Intermediate)");
   peer.chain = {&TestPki::Get().intermediate};
   EXPECT_EQ(Handshake(config, peer), "");
@@ -89,8 +90,9 @@ TEST(TrustStoreTest, RefusesALeafAsIssuer) {
   peer.identity = &leaf;
   peer.chain = {&TestPki::Get().leaf};
   const SSLContextConfig config = TrustingConfig(TestPki::Get().root);
-  EXPECT_THAT(Handshake(config, peer),
-              testing::StartsWith("TLS handshake with sts.example failed: invalid CA certificate"));
+  EXPECT_THAT(
+      Handshake(config, peer),
+      testing::StartsWith("TLS handshake with sts.example:PORT failed: invalid CA certificate"));
 }
 
 TEST(TrustStoreTest, LoadsCaFiles) {
