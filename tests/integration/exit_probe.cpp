@@ -1,5 +1,6 @@
 // Ends while calls are in progress: exit_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE
 // MICROSECONDS The exit status is 0 when all calls that the scenario observes ended as they should.
+#include <atomic>
 #include <chrono>
 #include <cstdlib>
 #include <functional>
@@ -22,6 +23,7 @@ using SsoClient::Testing::ProbeService;
 // Never destroyed: scenarios use it in exit handlers and destructors.
 const ProbeService* probe = nullptr;
 std::chrono::microseconds untilExit{0};
+std::chrono::steady_clock::time_point exitBegan;
 
 /// Ends the process when a call at its end did not fail as it should; destructors cannot return a
 /// status.
@@ -62,6 +64,15 @@ class JoiningGlobal {
 // run.
 JoiningGlobal joiningGlobal;
 
+/// Runs after the library's exit handler, which waits for at most 200 ms.
+void RequireQuickExit() {
+  constexpr std::chrono::seconds kLimitOnABusyMachine{3};
+  if (std::chrono::steady_clock::now() - exitBegan > kLimitOnABusyMachine) {
+    std::cerr << "the exit handler took too long\n";
+    _exit(4);
+  }
+}
+
 void StartAsyncCalls() {
   for (int i = 0; i < 100; ++i) {
     probe->service->AcquireTokenAsync("alice@EXAMPLE.COM", "secret", ProbeService::Spec(),
@@ -101,6 +112,24 @@ void CallAsynchronouslyFromAnExitHandler() {
   StartAsyncCalls();
 }
 
+/// More calls than workers: those that wait for a worker report too.
+void AwaitQueuedCallbacksInAnExitHandler() {
+  constexpr int kCalls = 300;
+  static std::atomic<int> reported{0};
+  static std::promise<void> allReported;
+  std::atexit([] { allReported.get_future().wait(); });
+  for (int i = 0; i < kCalls; ++i) {
+    probe->service->AcquireTokenAsync("alice@EXAMPLE.COM", "secret", ProbeService::Spec(),
+                                      [](const auto&, const Tarnik::Exception* failure) {
+                                        RequireEnding([&] { failure->Throw(); });
+                                        if (++reported == kCalls) {
+                                          allReported.set_value();
+                                        }
+                                      });
+  }
+  std::this_thread::sleep_for(untilExit);
+}
+
 /// A call that was begun before the end reports to its callback, which an exit handler waits for.
 void AwaitACallbackInAnExitHandler() {
   static std::promise<std::string> reported;
@@ -128,6 +157,7 @@ int main(int argc, char** argv) {
       {"call-in-handler", CallFromAnExitHandler},
       {"async-call-in-handler", CallAsynchronouslyFromAnExitHandler},
       {"callback-in-handler", AwaitACallbackInAnExitHandler},
+      {"queued-callbacks-in-handler", AwaitQueuedCallbacksInAnExitHandler},
   };
   const auto scenario = scenarios.find(argc == 6 ? argv[1] : "");
   if (scenario == scenarios.end()) {
@@ -135,6 +165,8 @@ int main(int argc, char** argv) {
   }
   probe = new ProbeService(argv[2], argv[3], argv[4]);
   untilExit = std::chrono::microseconds(std::atol(argv[5]));
+  std::atexit(&RequireQuickExit);
   scenario->second();
+  exitBegan = std::chrono::steady_clock::now();
   return 0;
 }

@@ -10,6 +10,7 @@
 
 #include "crypto/passphrase.h"
 #include "crypto/private_key_impl.h"
+#include "support/ascii.h"
 #include "support/openssl_error.h"
 #include "support/quote.h"
 #include "system/file.h"
@@ -88,7 +89,7 @@ std::string PathOf(const std::string& uri) {
   constexpr std::string_view kScheme = "file:";
   constexpr std::string_view kLocalHost = "//localhost/";
   std::string_view rest(uri);
-  if (rest.substr(0, kScheme.size()) != kScheme) {
+  if (!EqualsIgnoringCase(rest.substr(0, kScheme.size()), kScheme)) {
     return "";
   }
   rest.remove_prefix(kScheme.size());

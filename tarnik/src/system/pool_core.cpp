@@ -1,8 +1,12 @@
 #include "system/pool_core.h"
 
 #include <algorithm>
+#include <deque>
+#include <future>
 
 #include <boost/asio/io_context.hpp>
+#include <boost/asio/ip/tcp.hpp>
+#include <boost/asio/steady_timer.hpp>
 #include <boost/system/system_error.hpp>
 
 #include <tarnik/core/exception.h>
@@ -22,7 +26,11 @@ thread_local const PoolCore* ownCore = nullptr;
 
 std::unique_ptr<boost::asio::io_context> MakeIoContext() {
   try {
-    return std::make_unique<boost::asio::io_context>(static_cast<int>(kIoThreads));
+    auto ioContext = std::make_unique<boost::asio::io_context>(static_cast<int>(kIoThreads));
+    // Asio opens its descriptors for the first timer and socket.
+    const boost::asio::steady_timer timer(*ioContext);
+    const boost::asio::ip::tcp::socket socket(*ioContext);
+    return ioContext;
   } catch (const boost::system::system_error& error) {
     throw ResourceException("Cannot start the thread pool: " + error.code().message() + ".");
   }
@@ -62,6 +70,22 @@ void PoolCore::Freeze() {
   lookups_.Freeze(std::chrono::milliseconds(0));
   WaitForIoThreads(remaining());
   workers_.Freeze(remaining());
+  DropQueue(remaining());
+}
+
+// What an item reports when it is destroyed without having run may block.
+void PoolCore::DropQueue(std::chrono::milliseconds limit) {
+  const auto items = std::make_shared<std::deque<std::function<void()>>>(workers_.TakeQueue());
+  if (items->empty()) {
+    return;
+  }
+  const auto done = std::make_shared<std::promise<void>>();
+  auto isDone = done->get_future();
+  StartPoolThread("tarnik-exit", [items, done] {
+    items->clear();
+    done->set_value();
+  });
+  isDone.wait_for(limit);
 }
 
 void PoolCore::IoLoop() {

@@ -40,6 +40,7 @@ class PoolCore {
  private:
   void IoLoop();
   void WaitForIoThreads(std::chrono::milliseconds limit);
+  void DropQueue(std::chrono::milliseconds limit);
 
   const std::unique_ptr<boost::asio::io_context> ioContext_;
   WorkerSet workers_;

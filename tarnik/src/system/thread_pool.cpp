@@ -1,6 +1,7 @@
 #include <algorithm>
 #include <chrono>
 #include <cstdlib>
+#include <exception>
 #include <memory>
 #include <new>
 #include <utility>
@@ -144,8 +145,14 @@ void ThreadPoolImpl::ForgetParent() noexcept {
 
 void ThreadPoolImpl::EndProcess() noexcept {
   BeginProcessEnd();
-  if (PoolCore* const core = core_.load(std::memory_order_acquire)) {
+  PoolCore* const core = core_.load(std::memory_order_acquire);
+  if (core == nullptr) {
+    return;
+  }
+  try {
     core->Freeze();
+  } catch (const std::exception&) {
+    // No thread or memory for the rest of the queue, whose items then never report.
   }
 }
 

@@ -56,6 +56,11 @@ void WorkerSet::Freeze(std::chrono::milliseconds limit) {
                           [this, ownThreads] { return workers_ - idle_ <= ownThreads; });
 }
 
+std::deque<std::function<void()>> WorkerSet::TakeQueue() {
+  const std::lock_guard lock(mutex_);
+  return std::exchange(items_, {});
+}
+
 std::size_t WorkerSet::WorkerCount() const {
   const std::lock_guard lock(mutex_);
   return workers_;

@@ -28,6 +28,9 @@ class WorkerSet {
   /// for good. Waits at most `limit` for items that are under way on other threads.
   void Freeze(std::chrono::milliseconds limit);
 
+  /// Takes out the items that have not started.
+  std::deque<std::function<void()>> TakeQueue();
+
   std::size_t WorkerCount() const;
 
  private:

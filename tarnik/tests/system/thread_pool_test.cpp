@@ -1,12 +1,16 @@
 #include <atomic>
 #include <chrono>
+#include <filesystem>
 #include <future>
 #include <memory>
 #include <mutex>
 #include <set>
+#include <string>
+#include <system_error>
 #include <thread>
 #include <vector>
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
 
@@ -195,6 +199,22 @@ TEST(ThreadPoolTest, BlocksTheHostsSignalsOnItsThreads) {
                       sigismember(&mask, SIGSEGV) == 0);
   });
   EXPECT_TRUE(blocked.get_future().get());
+}
+
+TEST(ThreadPoolTest, ItsDescriptorsAreNotInheritedByPrograms) {
+  std::promise<void> done;
+  GetThreadPool()->RunAfter(1, [&] { done.set_value(); });
+  done.get_future().wait();
+  int ofThePool = 0;
+  for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd")) {
+    std::error_code ignored;
+    const std::string target = std::filesystem::read_symlink(entry.path(), ignored).string();
+    if (target.starts_with("anon_inode:[event") || target.starts_with("anon_inode:[timerfd")) {
+      ++ofThePool;
+      EXPECT_NE(fcntl(std::stoi(entry.path().filename()), F_GETFD) & FD_CLOEXEC, 0) << target;
+    }
+  }
+  EXPECT_GE(ofThePool, 3);
 }
 
 }  // namespace

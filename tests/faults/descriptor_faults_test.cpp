@@ -1,0 +1,90 @@
+// Calls of a process that may open no further descriptor, in a forked child.
+#include <future>
+#include <string>
+
+#include <gtest/gtest.h>
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <ssoclient/ssoclient.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/system/thread_pool.h>
+
+#include "faults/sts_client.h"
+#include "support/forked_child.h"
+
+namespace SsoClient::Testing {
+namespace {
+
+using Tarnik::Testing::HoldsInChild;
+
+/// During its lifetime this process can open no descriptor.
+class DescriptorShortage {
+ public:
+  DescriptorShortage() {
+    getrlimit(RLIMIT_NOFILE, &before_);
+    // The lowest descriptor that is free.
+    const int lowest = dup(STDERR_FILENO);
+    close(lowest);
+    const rlimit shortage{static_cast<rlim_t>(lowest), before_.rlim_max};
+    setrlimit(RLIMIT_NOFILE, &shortage);
+  }
+  ~DescriptorShortage() { setrlimit(RLIMIT_NOFILE, &before_); }
+  DescriptorShortage(const DescriptorShortage&) = delete;
+  DescriptorShortage& operator=(const DescriptorShortage&) = delete;
+
+ private:
+  rlimit before_{};
+};
+
+constexpr char kNoPool[] = "Cannot start the thread pool: Too many open files.";
+
+template <class Failure, class Call>
+std::string MessageOf(const Call& call) {
+  const DescriptorShortage shortage;
+  try {
+    call();
+    return "no failure";
+  } catch (const Failure& failure) {
+    return failure.Message();
+  }
+}
+
+void StartThePool() {
+  std::promise<void> done;
+  Tarnik::System::GetThreadPool()->Run([&] { done.set_value(); });
+  done.get_future().wait();
+}
+
+TEST(DescriptorFaultsTest, WithoutDescriptorsForThePoolACallFails) {
+  const StsClient client = StsClient::WithTls();
+  EXPECT_TRUE(HoldsInChild([&] {
+    return MessageOf<Tarnik::ResourceException>([&] { client.Login(); }) == kNoPool &&
+           client.Login() != nullptr;
+  }));
+}
+
+TEST(DescriptorFaultsTest, WithoutDescriptorsForThePoolAnAsyncCallIsRefused) {
+  const StsClient client = StsClient::WithTls();
+  EXPECT_TRUE(HoldsInChild([&] {
+    return MessageOf<Tarnik::ResourceException>([&] {
+             client.Service().AcquireTokenAsync(
+                 kUser, kPassword, StsClient::Spec(),
+                 [](const auto&, const Tarnik::Exception*) { Tarnik::Testing::EndChild(false); });
+           }) == kNoPool &&
+           client.Login() != nullptr;
+  }));
+}
+
+TEST(DescriptorFaultsTest, WithoutADescriptorForItsSocketACallFails) {
+  const StsClient client = StsClient::WithTls();
+  EXPECT_TRUE(HoldsInChild([&] {
+    StartThePool();
+    const std::string message = MessageOf<CommunicationException>([&] { client.Login(); });
+    return message.starts_with("Cannot connect to 127.0.0.1:") &&
+           message.ends_with(": Too many open files") && client.Login() != nullptr;
+  }));
+}
+
+}  // namespace
+}  // namespace SsoClient::Testing
