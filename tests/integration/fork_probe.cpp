@@ -1,5 +1,7 @@
-// Forks while calls are in progress: fork_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE FORKS
+// Forks while calls are in progress:
+// fork_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE FORKS THREADS
 // The exit status is 0 when all calls of all processes succeeded.
+#include <algorithm>
 #include <atomic>
 #include <cstdlib>
 #include <functional>
@@ -21,13 +23,13 @@ namespace {
 
 using SsoClient::Testing::ProbeService;
 
-constexpr int kThreads = 32;
 // Ends a child that hangs. Its parent sees the signal.
 constexpr unsigned kChildLimitSeconds = 60;
 constexpr int kFailed = 3;
 
 const ProbeService* probe = nullptr;
 int forks = 0;
+int threads = 0;
 
 int StatusOf(const std::function<void()>& calls) {
   try {
@@ -107,7 +109,8 @@ class Callers {
 
 /// Forks children one after the other while threads are inside calls.
 bool ForkUnderLoad(const std::function<void()>& body) {
-  Callers callers(kThreads);
+  probe->Login();
+  Callers callers(threads);
   bool isGood = true;
   for (int i = 0; i < forks; ++i) {
     isGood = HasSucceeded(ForkChild(body)) && isGood;
@@ -133,7 +136,7 @@ bool CallInGrandchildren() {
   bool isGood = true;
   for (int i = 0; i < forks; ++i) {
     isGood = HasSucceeded(ForkChild([] {
-               auto* const callers = new Callers(4);
+               auto* const callers = new Callers(std::min(threads, 4));
                const bool isGrandchildGood =
                    HasSucceeded(ForkChild([] { _exit(StatusOf(CallEverything)); }));
                _exit(callers->Stop() && isGrandchildGood ? EXIT_SUCCESS : kFailed);
@@ -172,11 +175,12 @@ int main(int argc, char** argv) {
       {"grandchildren", CallInGrandchildren},
       {"callback", ReturnFromACallbackInTheChild},
   };
-  const auto scenario = scenarios.find(argc == 6 ? argv[1] : "");
+  const auto scenario = scenarios.find(argc == 7 ? argv[1] : "");
   if (scenario == scenarios.end()) {
     return 2;
   }
   probe = new ProbeService(argv[2], argv[3], argv[4]);
   forks = std::atoi(argv[5]);
+  threads = std::atoi(argv[6]);
   return scenario->second() ? EXIT_SUCCESS : kFailed;
 }

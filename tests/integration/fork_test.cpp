@@ -8,6 +8,14 @@
 namespace SsoClient::Testing {
 namespace {
 
+// The threads of the parent that are inside calls. The allocator of AddressSanitizer remains locked
+// in a child when another thread allocates during the fork, so there the parent's threads are idle.
+#ifdef __SANITIZE_ADDRESS__
+constexpr int kThreads = 0;
+#else
+constexpr int kThreads = 32;
+#endif
+
 // The STS is in this process and the calls are in the probe's, so that only the libraries of the
 // probe are forked.
 class ForkTest : public StsTest {
@@ -15,9 +23,9 @@ class ForkTest : public StsTest {
   static int RunProbe(const std::string& scenario, int forks) {
     const TemporaryFile ca(Sts().CaCertificatePem());
     const TemporaryFile signing(Sts().SigningCertificatePem());
-    return RunToEnd(
-        {FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(), std::to_string(forks)},
-        /*isLeakCheckOff=*/true);
+    return RunToEnd({FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(),
+                     std::to_string(forks), std::to_string(kThreads)},
+                    /*isLeakCheckOff=*/true);
   }
 };
 

@@ -53,13 +53,14 @@ std::string ErrorScope::Describe(std::string_view what) const {
 
 FreshErrors::FreshErrors() {
   Initialise();
-  Saved saved{};
+  const char* file = nullptr;
+  const char* function = nullptr;
   const char* text = nullptr;
+  int line = 0;
   int flags = 0;
-  while ((saved.code =
-              ERR_get_error_all(&saved.file, &saved.line, &saved.function, &text, &flags)) != 0) {
-    saved.text = (flags & ERR_TXT_STRING) != 0 ? text : "";
-    saved_.push_back(saved);
+  while (const unsigned long code = ERR_get_error_all(&file, &line, &function, &text, &flags)) {
+    // Copied, since the queue owns the texts.
+    saved_.push_back({code, file, line, function, (flags & ERR_TXT_STRING) != 0 ? text : ""});
   }
 }
 
@@ -67,7 +68,7 @@ FreshErrors::~FreshErrors() {
   ERR_clear_error();
   for (const Saved& saved : saved_) {
     ERR_new();
-    ERR_set_debug(saved.file, saved.line, saved.function);
+    ERR_set_debug(saved.file.c_str(), saved.line, saved.function.c_str());
     ERR_set_error(ERR_GET_LIB(saved.code), ERR_GET_REASON(saved.code),
                   saved.text.empty() ? nullptr : "%s", saved.text.c_str());
   }

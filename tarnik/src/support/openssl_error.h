@@ -49,9 +49,9 @@ class FreshErrors {
  private:
   struct Saved {
     unsigned long code;
-    const char* file;
+    std::string file;
     int line;
-    const char* function;
+    std::string function;
     std::string text;
   };
   Section section_;
