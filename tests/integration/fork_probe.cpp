@@ -81,8 +81,8 @@ void CallEverything() {
 /// Threads that are inside calls as long as this object exists.
 class Callers {
  public:
-  explicit Callers(int threads) {
-    for (int i = 0; i < threads; ++i) {
+  explicit Callers(int count) {
+    for (int i = 0; i < count; ++i) {
       threads_.emplace_back([this] {
         while (!isStopping_) {
           if (StatusOf([] { probe->Login(); }) != EXIT_SUCCESS) {
