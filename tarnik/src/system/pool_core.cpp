@@ -68,24 +68,27 @@ void PoolCore::Freeze() {
   };
   ioContext_->stop();
   lookups_.Freeze(std::chrono::milliseconds(0));
+  workers_.Freeze(std::chrono::milliseconds(0));
+  const std::future<void> isQueueDropped = DropQueue();
   WaitForIoThreads(remaining());
   workers_.Freeze(remaining());
-  DropQueue(remaining());
+  isQueueDropped.wait_for(remaining());
 }
 
-// What an item reports when it is destroyed without having run may block.
-void PoolCore::DropQueue(std::chrono::milliseconds limit) {
+// On another thread, since what an item does when it is destroyed without having run may block.
+std::future<void> PoolCore::DropQueue() {
   const auto items = std::make_shared<std::deque<std::function<void()>>>(workers_.TakeQueue());
-  if (items->empty()) {
-    return;
-  }
   const auto done = std::make_shared<std::promise<void>>();
+  if (items->empty()) {
+    done->set_value();
+    return done->get_future();
+  }
   auto isDone = done->get_future();
   StartPoolThread("tarnik-exit", [items, done] {
     items->clear();
     done->set_value();
   });
-  isDone.wait_for(limit);
+  return isDone;
 }
 
 void PoolCore::IoLoop() {

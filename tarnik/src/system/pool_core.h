@@ -5,6 +5,7 @@
 #include <condition_variable>
 #include <cstddef>
 #include <functional>
+#include <future>
 #include <memory>
 #include <mutex>
 
@@ -40,7 +41,7 @@ class PoolCore {
  private:
   void IoLoop();
   void WaitForIoThreads(std::chrono::milliseconds limit);
-  void DropQueue(std::chrono::milliseconds limit);
+  std::future<void> DropQueue();
 
   const std::unique_ptr<boost::asio::io_context> ioContext_;
   WorkerSet workers_;

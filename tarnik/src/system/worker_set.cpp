@@ -26,6 +26,10 @@ void WorkerSet::Run(std::function<void()> item) {
   // Destroyed after the lock is released, since destructors of its captures may call `Run`.
   std::function<void()> refused;
   const std::lock_guard lock(mutex_);
+  if (isQueueTaken_) {
+    refused.swap(item);
+    return;
+  }
   items_.push_back(std::move(item));
   if (phase_ != Phase::kRunning) {
     return;
@@ -58,6 +62,7 @@ void WorkerSet::Freeze(std::chrono::milliseconds limit) {
 
 std::deque<std::function<void()>> WorkerSet::TakeQueue() {
   const std::lock_guard lock(mutex_);
+  isQueueTaken_ = true;
   return std::exchange(items_, {});
 }
 

@@ -28,7 +28,7 @@ class WorkerSet {
   /// for good. Waits at most `limit` for items that are under way on other threads.
   void Freeze(std::chrono::milliseconds limit);
 
-  /// Takes out the items that have not started.
+  /// Takes out the items that have not started. Later items are destroyed by `Run`.
   std::deque<std::function<void()>> TakeQueue();
 
   std::size_t WorkerCount() const;
@@ -51,6 +51,7 @@ class WorkerSet {
   std::size_t workers_ = 0;
   std::size_t idle_ = 0;
   Phase phase_ = Phase::kRunning;
+  bool isQueueTaken_ = false;
 };
 
 }  // namespace Tarnik::System
