@@ -1,7 +1,8 @@
-// Asks the service about several tokens over one connection.
+// Asks the service about several tokens over one connection. Ends with status 1 if one is invalid.
 #include <fstream>
 #include <iostream>
 #include <iterator>
+#include <stdexcept>
 #include <string>
 
 #include <ssoclient/ssoclient.h>
@@ -24,19 +25,24 @@ int main(int argc, char** argv) {
     std::string host;
     int port = 0;
     Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, config.url);
-
     const auto spec = Tarnik::Http::CreateTLSConnectionSpec(host, port, sslContext.get(), "");
     config.userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
     config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
     const auto service = SsoClient::CreateSecurityTokenService(config);
 
+    int status = 0;
     for (int i = 4; i < argc; ++i) {
       std::ifstream file(argv[i]);
       const std::string text(std::istreambuf_iterator<char>(file), {});
+      if (text.empty()) {
+        throw std::runtime_error(std::string("cannot read ") + argv[i]);
+      }
       const auto token = SsoClient::CreateSamlToken(text, trustedKeys.get());
-      std::cout << (service->ValidateSubject(*token) ? "valid: " : "INVALID: ") << argv[i] << '\n';
+      const bool isValid = service->ValidateSubject(*token);
+      std::cout << (isValid ? "valid: " : "INVALID: ") << argv[i] << '\n';
+      status = isValid ? status : 1;
     }
-    return 0;
+    return status;
   } catch (const std::exception& e) {
     std::cerr << "Not validated: " << e.what() << '\n';
     return 1;

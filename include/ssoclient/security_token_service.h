@@ -41,19 +41,28 @@ namespace SsoClient {
 ///    `ParseException`, `InvalidSignatureException`, `Tarnik::Xml::XMLParseException`,
 ///    `Tarnik::Base64FormatException`, `Tarnik::Crypto::CryptoException` and the exceptions of its
 ///    resolver, as `CreateSamlToken` does;
-///  - `Tarnik::ResourceException` when the system cannot start a thread that the operation needs;
-///  - `std::bad_alloc` when memory runs out. The callback of an asynchronous operation receives a
-///    `Tarnik::ResourceException` instead.
+///  - `Tarnik::ResourceException` when the platform's thread pool cannot be started;
+///  - `std::bad_alloc` when memory runs out on the calling thread. A shortage on a thread of the
+///    platform is a failure of the exchange, a `CommunicationException`.
 ///
 /// A returned token is null only if the service answers with an empty token text.
 ///
-/// Each asynchronous operation returns immediately and reports to its callback, which must not be
-/// empty (`Tarnik::InvalidArgumentException`). If the operation throws a `Tarnik::Exception`, as in
-/// every case above, the callback receives it. Any other exception, such as a `std::exception` from
-/// the caller's negotiation handler, leaves the worker thread and terminates the process. Arguments
-/// are copied, except tokens and negotiation handlers, which are passed by reference: the caller
-/// keeps them alive until the callback has returned. The service may be released earlier. At most
-/// 256 asynchronous operations run at the same time in a process; further ones wait in a queue.
+/// Each asynchronous operation returns immediately and reports to its callback. Arguments are
+/// copied, except tokens and negotiation handlers, which are passed by reference: the caller keeps
+/// them alive until the callback has returned. The service may be released earlier. At most 256
+/// asynchronous operations run at the same time in a process; further ones wait in a queue.
+///
+/// The function itself throws, and the callback then never runs,
+///  - `Tarnik::InvalidArgumentException` when the callback is empty;
+///  - `CommunicationException` when the process is ending;
+///  - `Tarnik::ResourceException` when the platform's thread pool cannot be started;
+///  - `std::bad_alloc` when memory runs out before the operation is in the queue.
+///
+/// The callback receives every `Tarnik::Exception` that the operation throws, as listed above; a
+/// `Tarnik::ResourceException` in place of `std::bad_alloc`, and when there is no worker thread and
+/// none can be started; and a `CommunicationException` when the process ends before the operation
+/// has started. Any other exception that leaves the operation, such as a `std::exception` from the
+/// caller's negotiation handler, ends the process.
 ///
 /// Time-outs are fixed. To give up earlier, use a service with a bounded user agent
 /// (`tarnik/http/bounded_user_agent.h`): an asynchronous operation that is only abandoned keeps its
@@ -61,7 +70,10 @@ namespace SsoClient {
 class SecurityTokenService {
  public:
   /// Receives a token and null, or null and the exception, which is valid only during the call.
-  /// Called once, on a worker thread of the platform's pool, where it may block. It must not throw.
+  /// Called once, on a worker thread of the platform's pool, where it may block. Only when no
+  /// worker can be started is it called on an I/O thread, with a `Tarnik::ResourceException`, and
+  /// only when the process ends before the operation has started, on a thread that is started for
+  /// that. It must not throw: an exception that leaves it, also `std::bad_alloc`, ends the process.
   using TokenCallback =
       std::function<void(const std::shared_ptr<const SamlToken>&, const Tarnik::Exception*)>;
   /// The same for the result of `ValidateSubject`.

@@ -4,9 +4,9 @@
 #include <cstddef>
 
 /// Makes one call of a kind fail: an allocation by operator new or by the library's calls of
-/// malloc, which provide Expat's memory, an allocation within OpenSSL, or an OpenSSL call that
-/// digests, verifies or signs. One fault at a time; the
-/// call may be on any thread.
+/// malloc, which provide Expat's memory, an allocation within OpenSSL, an OpenSSL call that
+/// digests, verifies or signs, or the start of a thread. One fault at a time; the call may be on
+/// any thread.
 namespace SsoClient::Testing {
 
 enum class FaultKind {

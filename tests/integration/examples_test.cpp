@@ -1,4 +1,4 @@
-// The examples that read a token from a file.
+// The examples that read a token from a file or give up, and their status.
 #include <array>
 #include <cstdio>
 #include <cstdlib>
@@ -88,6 +88,7 @@ TEST_F(ExamplesTest, TokenFilesThatCannotBeReadAreFailures) {
            check + missing + " " + signing_ + " here",
            "check_token_by_issuer " + missing + " issuer " + signing_,
            "validate_token " + service + missing,
+           "keep_connections " + service + missing,
        }) {
     const Outcome run = RunExample(command);
     EXPECT_GT(run.status, 0) << command;
@@ -96,6 +97,40 @@ TEST_F(ExamplesTest, TokenFilesThatCannotBeReadAreFailures) {
   const Outcome folder = RunExample(check + "/tmp " + signing_ + " here");
   EXPECT_EQ(folder.status, 1);
   EXPECT_THAT(folder.output, StartsWith("refused: "));
+}
+
+TEST_F(ExamplesTest, KeepConnectionsFailsIfOneOfTheTokensIsInvalid) {
+  const auto revoked = Service()->AcquireToken(kUser, kPassword, TenMinutes());
+  const auto valid = Service()->AcquireToken(kUser, kPassword, TenMinutes());
+  const auto revokedFile = folder_.Write("revoked.xml", revoked->Xml());
+  const auto validFile = folder_.Write("valid.xml", valid->Xml());
+  ASSERT_TRUE(Sts().Revoke(revoked->Id()));
+  const std::string command = "keep_connections " + Sts().HttpsUrl() + " " + ca_ + " " + signing_;
+  const Outcome good = RunExample(command + " " + validFile + " " + validFile);
+  EXPECT_EQ(good.output, "valid: " + validFile + "\nvalid: " + validFile + "\n");
+  EXPECT_EQ(good.status, 0);
+  const Outcome run = RunExample(command + " " + revokedFile + " " + validFile);
+  EXPECT_EQ(run.output, "INVALID: " + revokedFile + "\nvalid: " + validFile + "\n");
+  EXPECT_EQ(run.status, 1);
+}
+
+TEST_F(ExamplesTest, LimitACallGivesUpOnlyAtItsDeadline) {
+  const std::string command = "limit_a_call " + Sts().HttpsUrl() + " " + ca_ + " " + signing_ + " ";
+  const std::string login = kUser + (" <" + folder_.Write("password", kPassword));
+  EXPECT_EQ(RunExample(command + login).status, 0);
+
+  // Nothing trusts the certificate of the service.
+  const Outcome untrusted = RunExample("limit_a_call " + Sts().HttpsUrl() + " " + signing_ + " " +
+                                       signing_ + " " + login);
+  EXPECT_THAT(untrusted.output, StartsWith("No token: TLS handshake with "));
+  EXPECT_EQ(untrusted.status, 1);
+
+  DevSts::Misbehavior silent;
+  silent.stall = DevSts::Stall::BeforeAnswer;
+  Sts().SetMisbehavior(silent);
+  const Outcome late = RunExample(command + login);
+  EXPECT_THAT(late.output, StartsWith("given up: The caller's deadline has passed. "));
+  EXPECT_EQ(late.status, 3);
 }
 
 }  // namespace

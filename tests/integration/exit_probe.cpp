@@ -1,5 +1,6 @@
-// Ends while calls are in progress: exit_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE
-// MICROSECONDS The exit status is 0 when all calls that the scenario observes ended as they should.
+// Ends while calls are in progress:
+// exit_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE MICROSECONDS
+// The exit status is 0 when all calls that the scenario observes ended as they should.
 #include <atomic>
 #include <chrono>
 #include <cstdlib>

@@ -52,8 +52,8 @@ struct LogRecord {
   std::string_view text;
 };
 
-/// Receives every line that its logger's level allows; called on the thread that logs, possibly
-/// from several threads at once.
+/// Receives every line that its logger's level allows. It is called on the thread that logs, so
+/// several threads may call it at once. A sink may log; it then receives its own lines as well.
 using LogSink = std::function<void(const LogRecord&)>;
 
 /// Sends all lines to `sink` from now on; an empty sink restores the default, which writes time,

@@ -14,7 +14,9 @@ namespace Tarnik::Ssl {
 
 /// A TLS connection over another stream. `Close` closes the stream below. When the stream below
 /// ends without the peer's close_notify, a read fails with an `SSLException`, so that truncated
-/// data is never taken for complete data (RFC 8446, section 6.1).
+/// data is never taken for complete data (RFC 8446, section 6.1). A shortage of memory on an I/O
+/// thread fails the connection; what leaves a completion of the caller ends the process, and a
+/// forked child cannot use the stream of its parent, as `Stream` says.
 class TARNIK_EXPORT SSLStream : public System::Stream {
  public:
   using HandshakeCompletion = std::function<void(Exception* error)>;
@@ -29,8 +31,8 @@ class TARNIK_EXPORT SSLStream : public System::Stream {
 
 /// Trust and sessions shared by TLS connections. Immutable; thread-safe. Supports TLS 1.3 and, with
 /// ECDHE and AES-GCM or ChaCha20-Poly1305, TLS 1.2 (RFC 9325); neither OpenSSL's configuration file
-/// nor the environment changes what is offered.
-/// Sessions are resumed only with the same host, on any port, and the same server name.
+/// nor the environment changes what is offered. Sessions are resumed only with the same host, on
+/// any port, and the same server name.
 class TARNIK_EXPORT SSLContext : public virtual Object {
  public:
   /// A TLS stream over `stream`. `name` is a label for diagnostics and may be empty.

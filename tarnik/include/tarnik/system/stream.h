@@ -16,6 +16,13 @@ namespace Tarnik::System {
 /// thread of the pool and never inside the call that started the operation; it must not block. The
 /// exception is null on success and valid only during the call. The stream keeps itself alive while
 /// an operation is under way.
+///
+/// An exception that leaves a completion ends the process; this includes `std::bad_alloc`, so a
+/// completion that allocates catches it. An allocation of the platform's own that fails on an I/O
+/// thread is a failure of the operation.
+///
+/// A stream belongs to the process that opened it. In a child that was forked later, `Close` does
+/// nothing, and the other functions throw `InvalidStateException`.
 class TARNIK_EXPORT Stream : public virtual Object {
  public:
   using ReadCompletion = std::function<void(std::size_t bytesRead, Exception* error)>;

@@ -22,18 +22,21 @@ class TARNIK_EXPORT TCPClientSocket : public Stream {
   /// take turns, and the next address is tried when the one before it has failed or has not
   /// answered for 250 ms (RFC 8305, sections 4 and 5). The completion receives this socket and
   /// null, or this socket and an `IOException` that names host, port and the last cause, or a
-  /// `CancelledException` after `Close`. A shortage of threads or memory after this call has
-  /// returned is such an `IOException` too. Called once per socket.
+  /// `CancelledException` after `Close`. A thread for the look-up that cannot be started, and a
+  /// shortage of memory after this call has returned, are such an `IOException` too. As in
+  /// `Stream`, an exception that leaves the completion ends the process. Called once per socket.
   ///
   /// Throws `InvalidArgumentException` when `host` cannot be a host name (empty, too long, blanks,
   /// control characters, brackets, ...) or `port` is not 1 to 65535, and `InvalidStateException`
-  /// when this function was called before. Reads and writes throw `InvalidStateException` before
-  /// the connection is established and while another operation of their kind is under way.
+  /// when this function was called before or the socket belongs to the parent process. Reads and
+  /// writes throw `InvalidStateException` before the connection is established and while another
+  /// operation of their kind is under way.
   virtual void ConnectAsync(const std::string& host, int port, ConnectCompletion completion) = 0;
 };
 
 /// A new, unconnected socket whose completions run on the I/O threads of `pool`. Throws
-/// `InvalidArgumentException` unless `pool` is the one that `GetThreadPool` returns.
+/// `InvalidArgumentException` unless `pool` is the one that `GetThreadPool` returns, and
+/// `ResourceException` or `InvalidStateException` when the pool cannot be started (`ThreadPool`).
 TARNIK_EXPORT Ref<TCPClientSocket> CreateTCPClientSocket(ThreadPool* pool);
 
 /// An item for a connect of `socket`, of which it holds one reference. `Cancel` closes the socket

@@ -23,20 +23,27 @@ namespace Tarnik::System {
 /// A forked child has the same pool with threads of its own, which start on first use. Items,
 /// completions and timers of the parent run only in the parent. When an item or a completion forks,
 /// the child should call `exec` or `_exit` within it: if the item returns in the child, the child
-/// ends as if by `exit(0)`, since the thread belongs to the parent.
+/// ends as if by `exit(0)`, since the thread belongs to the parent. `fork` runs handlers that
+/// acquire locks, so a signal handler must not call it; `_Fork` runs none, and its child may only
+/// call `exec` or `_exit`.
 class TARNIK_EXPORT ThreadPool : public virtual Object {
  public:
   static constexpr int kMaxWorkers = 256;
 
-  /// Runs `item` on a worker thread. An exception that leaves the item ends the process, as on any
-  /// thread. Throws `InvalidArgumentException` when `item` is empty, and `ResourceException` when
-  /// the pool cannot be started or there is no worker and the system cannot create a thread; `Post`
-  /// and `RunAfter` as well, for the threads that they need.
+  /// Runs `item` on a worker thread. An exception that leaves the item, also `std::bad_alloc`, ends
+  /// the process, as on any thread; so does one that leaves a completion.
+  ///
+  /// Throws `InvalidArgumentException` when `item` is empty, and `ResourceException` when there is
+  /// no worker and the system cannot create a thread. `Run`, `Post` and `RunAfter` throw
+  /// `ResourceException` when the pool cannot be started for lack of threads or descriptors,
+  /// `InvalidStateException` when it was not started before the process began to end, and
+  /// `std::bad_alloc`. What they were given then never runs.
   virtual void Run(std::function<void()> item) = 0;
-  /// Runs `completion` on an I/O thread, never inside this call; it must not block.
+  /// Runs `completion` on an I/O thread, never inside this call; it must not block. Throws as `Run`
+  /// does for an empty function and for the pool.
   virtual void Post(std::function<void()> completion) = 0;
   /// Runs `completion` on an I/O thread after `microseconds`, unless the returned item is cancelled
-  /// first; a cancelled completion never runs.
+  /// first; a cancelled completion never runs. Throws as `Post` does.
   virtual Ref<CancellableItem> RunAfter(unsigned long microseconds,
                                         std::function<void()> completion) = 0;
 };
