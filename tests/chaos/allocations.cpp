@@ -97,10 +97,14 @@ void RequireEnding(const Run& run, const Call& call, const Ending& ending) {
     RequireSuccess(run, call.operation, *ending.outcome);
     return;
   }
-  RequireFailure(run, *ending.outcome,
-                 {typeid(CommunicationException), typeid(Tarnik::ResourceException),
-                  typeid(Tarnik::Crypto::CryptoException),
-                  typeid(Tarnik::Xml::Security::XmlSecurityException)});
+  RequireFailure(
+      run, *ending.outcome,
+      {typeid(CommunicationException), typeid(Tarnik::ResourceException),
+       typeid(Tarnik::Crypto::CryptoException), typeid(Tarnik::Xml::Security::XmlSecurityException),
+       typeid(InvalidSignatureException)});
+  // A good token is not said to be bad.
+  run.Require(ending.outcome->message.find("tampered") == std::string::npos,
+              "the message is: " + ending.outcome->message);
 }
 
 Call ChooseCall(Run& run) {

@@ -64,7 +64,12 @@ Outcome Perform(const Run& run, Operation operation, bool isAsync,
     return CallNow(operation, service, arguments);
   }
   ReportedCall call([] {});
-  call.Start(operation, service, arguments);
+  try {
+    call.Start(operation, service, arguments);
+  } catch (const Tarnik::ResourceException& refusal) {
+    run.Require(call.Callbacks() == 0, "the call threw and reported to its callback");
+    return {nullptr, std::nullopt, typeid(refusal), refusal.Message()};
+  }
   Outcome outcome = call.Wait();
   run.Require(call.Callbacks() == 1, "the callback did not run once");
   return outcome;

@@ -38,7 +38,8 @@ class ReportedCall {
   const std::shared_ptr<State> state_ = std::make_shared<State>();
 };
 
-/// Performs an operation, synchronously or not, and requires that a callback runs once.
+/// Performs an operation, synchronously or not, and requires that a callback runs once, or not at
+/// all when the start of the operation throws a `ResourceException`.
 Outcome Perform(const Run& run, Operation operation, bool isAsync,
                 const SecurityTokenService& service, const Arguments& arguments);
 

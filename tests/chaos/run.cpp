@@ -4,7 +4,9 @@
 #include <csignal>
 #include <cstring>
 #include <iostream>
+#include <iterator>
 #include <sstream>
+#include <string_view>
 #include <utility>
 
 #include <unistd.h>
@@ -17,21 +19,47 @@ constexpr unsigned kCaseLimitSeconds = 60;
 // The case for the signal handler.
 char currentCase[512] = "";
 
+// Signals that end the process, with what a sanitizer does about them.
+constexpr int kEndings[] = {SIGABRT, SIGSEGV, SIGBUS};
+struct sigaction formerActions[std::size(kEndings)];
+
+void WriteCase(std::string_view what) {
+  for (const std::string_view text :
+       {what, std::string_view(currentCase), std::string_view("\n")}) {
+    [[maybe_unused]] const auto written = write(STDERR_FILENO, text.data(), text.size());
+  }
+}
+
 void EndHangingCase(int /*signal*/) {
-  constexpr char kMessage[] = "VIOLATION, the case did not end: ";
-  [[maybe_unused]] auto written = write(STDERR_FILENO, kMessage, sizeof(kMessage) - 1);
-  written = write(STDERR_FILENO, currentCase, std::strlen(currentCase));
-  written = write(STDERR_FILENO, "\n", 1);
+  WriteCase("VIOLATION, the case did not end; ");
   _exit(1);
+}
+
+/// Returns to what raised the signal, which then ends the process.
+void NameEndingCase(int signal) {
+  WriteCase("VIOLATION, a signal; ");
+  for (std::size_t i = 0; i < std::size(kEndings); ++i) {
+    if (kEndings[i] == signal) {
+      sigaction(signal, &formerActions[i], nullptr);
+    }
+  }
+}
+
+void Handle(int signal, void (*handler)(int), struct sigaction* former) {
+  struct sigaction action = {};
+  action.sa_handler = handler;
+  action.sa_flags = SA_NODEFER;
+  sigaction(signal, &action, former);
 }
 
 }  // namespace
 
 Run::Run(std::string campaign, std::uint64_t seed, std::chrono::seconds time)
     : campaign_(std::move(campaign)), seed_(seed), time_(time), random_(seed) {
-  struct sigaction action = {};
-  action.sa_handler = &EndHangingCase;
-  sigaction(SIGALRM, &action, nullptr);
+  Handle(SIGALRM, &EndHangingCase, nullptr);
+  for (std::size_t i = 0; i < std::size(kEndings); ++i) {
+    Handle(kEndings[i], &NameEndingCase, &formerActions[i]);
+  }
 }
 
 bool Run::HasTime() const {
