@@ -106,6 +106,8 @@ void RunClock(Run& run) {
               std::to_string(jump.offset.count()) + " s after " +
               std::to_string(jump.moment.count()) + " us");
     const Arguments& arguments = peer.Arguments();
+    // The child must not inherit locks of the STS.
+    RequireState(run, before, false);
     if (!isSilent) {
       RunInChild(run, [&] {
         CallWithJump(run, operation, isAsync, jump, peer.Service(hasTls), arguments);

@@ -99,6 +99,8 @@ void RunDescriptors(Run& run) {
               (scarce.isPoolStarted ? "" : ", the first call") + ", " +
               std::to_string(scarce.free) + " free descriptors");
     const Arguments& arguments = peer.Arguments();
+    // The child must not inherit locks of the STS.
+    RequireState(run, before, false);
     RunInChild(run, [&] { RunScarce(run, scarce, service, arguments); });
   }
   run.Begin("the end");

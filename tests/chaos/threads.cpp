@@ -60,6 +60,8 @@ void RunThreads(Run& run) {
               std::to_string(shortage.thread) + " does not start");
     const Arguments& arguments = peer.Arguments();
     const auto& service = shortage.needsLookUp ? peer.ServiceByName() : peer.Service(hasTls);
+    // The child must not inherit locks of the STS.
+    RequireState(run, before, false);
     RunInChild(run, [&] { RunShortage(run, shortage, service, arguments); });
   }
   run.Begin("the end");
