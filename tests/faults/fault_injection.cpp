@@ -45,9 +45,10 @@ FaultKind KindOnThisThread() noexcept {
     char name[16] = "";
     pthread_getname_np(pthread_self(), name, sizeof(name));
     const std::string_view text = name;
-    kind = text == "tarnik-io"       ? FaultKind::kIoThreadAllocation
-           : text == "tarnik-worker" ? FaultKind::kWorkerAllocation
-                                     : FaultKind::kAllocation;
+    kind = text == "tarnik-io"         ? FaultKind::kIoThreadAllocation
+           : text == "tarnik-worker"   ? FaultKind::kWorkerAllocation
+           : text == kCallerThreadName ? FaultKind::kCallerAllocation
+                                       : FaultKind::kAllocation;
   }
   return kind;
 }
@@ -102,6 +103,10 @@ InjectedFault::InjectedFault(FaultKind kind, std::size_t index, int result) noex
 }
 
 InjectedFault::~InjectedFault() {
+  Disarm();
+}
+
+void InjectedFault::Disarm() noexcept {
   plan.isArmed = false;
 }
 

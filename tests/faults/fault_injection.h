@@ -17,9 +17,13 @@ enum class FaultKind {
   kIoThreadAllocation,
   /// The same on a worker of the pool.
   kWorkerAllocation,
+  /// The same on a thread with the name `kCallerThreadName`.
+  kCallerAllocation,
   /// The start of a thread.
   kThreadStart,
 };
+
+inline constexpr char kCallerThreadName[] = "test-caller";
 
 /// During its lifetime the call of `kind` with this index (counted from 0) fails; a crypto call
 /// returns `result`.
@@ -32,6 +36,8 @@ class InjectedFault {
 
   /// False if there were fewer calls.
   bool HasHappened() const noexcept;
+  /// Lets all further calls succeed, for code that cannot reach the object.
+  static void Disarm() noexcept;
 };
 
 /// During its lifetime every allocation fails, on all threads.

@@ -2,6 +2,7 @@
 #include <atomic>
 #include <cstddef>
 #include <future>
+#include <limits>
 #include <memory>
 #include <string>
 
@@ -23,13 +24,16 @@ struct Tally {
   std::size_t failures = 0;
 };
 
-/// Calls `login` with each allocation of `kind` failing, or only with every `stride`-th. A login
-/// either succeeds or fails with an exception of the platform; the next one succeeds.
+constexpr std::size_t kAll = std::numeric_limits<std::size_t>::max();
+
+/// Calls `login` with each of the first `end` allocations of `kind` failing, or only with every
+/// `stride`-th. A login either succeeds or fails with an exception of the platform; the next one
+/// succeeds.
 template <class Login>
 Tally FailEachAllocation(const StsClient& client, FaultKind kind, std::size_t stride,
-                         const Login& login) {
+                         const Login& login, std::size_t end = kAll) {
   Tally tally;
-  for (std::size_t index = 0;; index += stride) {
+  for (std::size_t index = 0; index < end; index += stride) {
     bool hasHappened = false;
     {
       const InjectedFault fault(kind, index);
@@ -46,6 +50,7 @@ Tally FailEachAllocation(const StsClient& client, FaultKind kind, std::size_t st
     ++tally.points;
     EXPECT_NE(client.Login(), nullptr) << "after the failure of allocation " << index;
   }
+  return tally;
 }
 
 std::shared_ptr<const SamlToken> LogIn(const StsClient& client) {
@@ -88,6 +93,15 @@ TEST(PoolMemoryFaultsTest, EachAllocationOnAnIoThreadMayFailWithTls) {
   EXPECT_GT(tally.points, 50U);
   EXPECT_GT(tally.failures, 20U);
   RecordProperty("points", static_cast<int>(tally.points));
+}
+
+// The object of a connection is made and connected to its callbacks first.
+TEST(PoolMemoryFaultsTest, EachAllocationOfTheSetUpOfTlsMayFail) {
+  const StsClient client = StsClient::WithTls();
+  constexpr std::size_t kSetUp = 100;
+  const Tally tally = FailEachAllocation(client, FaultKind::kIoThreadAllocation, 1, LogIn, kSetUp);
+  EXPECT_EQ(tally.points, kSetUp);
+  EXPECT_GT(tally.failures, kSetUp / 2);
 }
 
 TEST(PoolMemoryFaultsTest, EachAllocationOnAWorkerMayFail) {

@@ -54,14 +54,14 @@ TlsEngine::TlsEngine(Ref<SSLContextImpl> context, const std::string& host,
   ssl_.reset(SSL_new(context_->Get()));
   OpenSsl::OwnedBio input(BIO_new(BIO_s_mem()));
   OpenSsl::OwnedBio output(BIO_new(BIO_s_mem()));
-  if (ssl_ == nullptr || input == nullptr || output == nullptr) {
+  if (ssl_ == nullptr || input == nullptr || output == nullptr ||
+      SSL_set_app_data(ssl_.get(), this) != 1) {
     throw SSLException(errors.Describe("Cannot set up TLS for " + peer_));
   }
   input_ = input.get();
   output_ = output.get();
   SSL_set0_rbio(ssl_.get(), input.release());
   SSL_set0_wbio(ssl_.get(), output.release());
-  SSL_set_app_data(ssl_.get(), this);
   SSL_set_connect_state(ssl_.get());
   check_.ApplyTo(ssl_.get());
   Resume();
