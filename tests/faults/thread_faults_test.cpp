@@ -18,7 +18,6 @@ namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::System::GetThreadPool;
-using Tarnik::Testing::HoldsInChild;
 
 constexpr char kNoThread[] = "Cannot start a thread: Resource temporarily unavailable.";
 
@@ -32,6 +31,12 @@ bool RunsAnItem() {
   GetThreadPool()->Run([&] { done.set_value(); });
   done.get_future().wait();
   return true;
+}
+
+template <class Check>
+bool HoldsInChild(const Check& check) {
+  Tarnik::Testing::AwaitIdleThreads();
+  return Tarnik::Testing::HoldsInChild(check);
 }
 
 template <class Start>

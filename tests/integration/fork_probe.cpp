@@ -18,6 +18,7 @@
 #include <ssoclient/ssoclient.h>
 
 #include "integration/probe_service.h"
+#include "support/forked_child.h"
 
 namespace {
 
@@ -55,6 +56,9 @@ bool HasSucceeded(pid_t child) {
 }
 
 pid_t ForkChild(const std::function<void()>& body) {
+  if (threads == 0) {
+    Tarnik::Testing::AwaitIdleThreads();
+  }
   const pid_t child = fork();
   if (child == 0) {
     alarm(kChildLimitSeconds);
@@ -153,6 +157,9 @@ bool ReturnFromACallbackInTheChild() {
     std::promise<pid_t> forked;
     probe->service->AcquireTokenAsync("alice@EXAMPLE.COM", "secret", ProbeService::Spec(),
                                       [&forked](const auto&, const Tarnik::Exception*) {
+                                        if (threads == 0) {
+                                          Tarnik::Testing::AwaitIdleThreads();
+                                        }
                                         const pid_t child = fork();
                                         if (child == 0) {
                                           alarm(kChildLimitSeconds);

@@ -14,6 +14,9 @@ bool HoldsInChild(const Check& check);
 bool HasSucceeded(pid_t child);
 /// Forks. The child is ended by a signal after a minute.
 pid_t ForkWithLimit();
+/// Waits until all other threads sleep, so that none is inside an allocation: the allocator of
+/// AddressSanitizer remains locked in a child when another thread allocates during the fork.
+void AwaitIdleThreads();
 /// Ends a child without the exit handlers of the test program.
 [[noreturn]] void EndChild(bool hasSucceeded);
 
