@@ -10,8 +10,12 @@ OperationLog::OperationLog(std::string_view operation) : operation_(operation) {
 }
 
 OperationLog::~OperationLog() {
-  Tarnik::Service::LogInternal(kLogger, kTraceLevel, "END operation SecurityTokenServiceImpl::%1",
-                               {operation_});
+  try {
+    Tarnik::Service::LogInternal(kLogger, kTraceLevel, "END operation SecurityTokenServiceImpl::%1",
+                                 {operation_});
+  } catch (...) {
+    // Without memory the line is lost; the outcome of the operation is not.
+  }
 }
 
 }  // namespace SsoClient

@@ -62,8 +62,13 @@ Run::Run(std::string campaign, std::uint64_t seed, std::chrono::seconds time)
   }
 }
 
-bool Run::HasTime() const {
-  return cases_ == 0 || std::chrono::steady_clock::now() - begin_ < time_;
+bool Run::HasTime() {
+  const auto now = std::chrono::steady_clock::now();
+  if (!begin_) {
+    begin_ = now;
+    return true;
+  }
+  return now - *begin_ < time_;
 }
 
 std::size_t Run::Below(std::size_t bound) {

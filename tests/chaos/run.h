@@ -4,6 +4,7 @@
 #include <chrono>
 #include <cstddef>
 #include <cstdint>
+#include <optional>
 #include <random>
 #include <string>
 
@@ -16,8 +17,9 @@ class Run {
  public:
   Run(std::string campaign, std::uint64_t seed, std::chrono::seconds time);
 
-  /// True until the time of the run is over, which it is not before the first case.
-  bool HasTime() const;
+  /// True until the time of the run is over. It begins with the first call of this function, after
+  /// the preparations of a campaign, so one case runs in any time.
+  bool HasTime();
   /// True when the run is long enough to wait for threads that end after being idle.
   bool IsLong() const { return time_ >= std::chrono::seconds(30); }
 
@@ -44,7 +46,7 @@ class Run {
   const std::string campaign_;
   const std::uint64_t seed_;
   const std::chrono::seconds time_;
-  const std::chrono::steady_clock::time_point begin_ = std::chrono::steady_clock::now();
+  std::optional<std::chrono::steady_clock::time_point> begin_;
   std::mt19937_64 random_;
   std::string case_;
   std::size_t cases_ = 0;
