@@ -115,6 +115,29 @@ TEST_F(SigningFaultsTest, LeaveABlankSignatureWhenTheCryptographicLibraryFails) 
   }
 }
 
+// OpenSSL blinds an RSA key anew after some signatures, and reports a wrong value as a success when
+// memory runs out then.
+TEST_F(SigningFaultsTest, MakeNoWrongSignatureWhenMemoryRunsOutInTheCryptographicLibrary) {
+  constexpr std::size_t kSignatures = 400;
+  constexpr std::size_t kFirstAllocations = 12;
+  std::size_t refused = 0;
+  for (std::size_t i = 0; i < kSignatures; ++i) {
+    Prepare();
+    Outcome outcome;
+    {
+      const InjectedFault fault(FaultKind::kOpenSslAllocation, i % kFirstAllocations);
+      outcome = Sign();
+    }
+    if (outcome != Outcome::kSigned) {
+      ++refused;
+      continue;
+    }
+    request_->AppendChild(signature_->Element());
+    EXPECT_TRUE(DevSts::VerifyXml(XmlText(request_.get()), signer_.certificatePem)) << i;
+  }
+  EXPECT_GT(refused, 0U);
+}
+
 // Whichever construction step fails, nothing leaks, and no incomplete object is returned.
 TEST_F(SigningFaultsTest, LeakNothingWhenASignatureCannotBeCreated) {
   std::size_t failures = 0;

@@ -137,9 +137,17 @@ void ResourceException::Throw() const {
   throw ResourceException(*this);
 }
 
+namespace {
+
 // Never destroyed, since threads may report it while the process ends.
+ResourceException* MakeOutOfMemory() {
+  return new ResourceException("There is not enough memory.");
+}
+
+}  // namespace
+
 const ResourceException& OutOfMemory() noexcept {
-  static ResourceException* const failure = new ResourceException("There is not enough memory.");
+  static const ResourceException* const failure = MakeOutOfMemory();
   return *failure;
 }
 

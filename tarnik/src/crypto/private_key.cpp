@@ -181,6 +181,12 @@ std::vector<unsigned char> PrivateKeyImpl::Sign(SignatureScheme scheme, Hash has
     throw CryptoException(errors.Describe("The signature cannot be made"));
   }
   value.resize(length);
+  // When an allocation fails while OpenSSL blinds the key, it reports a wrong value as a success.
+  // Such a value also endangers the key.
+  if (scheme != SignatureScheme::kEcdsa &&
+      !publicKey_->Verify(scheme, hash, digest, value.data(), value.size())) {
+    throw CryptoException("The signature cannot be made: the cryptographic library failed.");
+  }
   contexts_.Keep(scheme, hash, std::move(context));
   return value;
 }

@@ -50,7 +50,7 @@ class TcpConnectionSpec : public CustomConnectionSpec, public ObjectImpl {
 
   Ref<System::CancellableItem> Connect(TCPClientSocket::ConnectCompletion completion) const {
     const auto socket = System::CreateTCPClientSocket(System::GetThreadPool().get());
-    const auto item = System::CreateConnectItem(socket.get());
+    auto item = System::CreateConnectItem(socket.get());
     socket->ConnectAsync(host_, port_, std::move(completion));
     return item;
   }
