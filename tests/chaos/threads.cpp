@@ -22,7 +22,7 @@ struct Case {
   bool needsLookUp;
 };
 
-/// In a child, which has no threads yet. Afterwards calls succeed and leave nothing behind.
+/// In a child, which has no threads yet. Afterwards calls succeed, and no thread or descriptor remains.
 void RunShortage(const Run& run, const Case& shortage, const SecurityTokenService& service,
                  const Arguments& arguments) {
   {

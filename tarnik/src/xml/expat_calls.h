@@ -34,7 +34,7 @@ inline std::int64_t ByteIndex(XML_Parser parser) noexcept {
 
 /// The part of the document that is in the parser's memory.
 struct InputContext {
-  const char* bytes = nullptr;  ///< null if there is none
+  const char* bytes = nullptr;  ///< may be null
   std::int64_t offset = 0;      ///< of the current event, in `bytes`
   std::uint64_t size = 0;
 };
