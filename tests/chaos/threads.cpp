@@ -22,7 +22,8 @@ struct Case {
   bool needsLookUp;
 };
 
-/// In a child, which has no threads yet. Afterwards calls succeed, and no thread or descriptor remains.
+/// In a child, which has no threads yet. Afterwards calls succeed, and no thread or descriptor
+/// remains.
 void RunShortage(const Run& run, const Case& shortage, const SecurityTokenService& service,
                  const Arguments& arguments) {
   {

@@ -71,14 +71,22 @@ bool IsRsaMismatch(unsigned long error) noexcept {
   }
 }
 
-// OpenSSL reports an RSA signature that does not match as an error, and an ECDSA one with the
-// result 0 and, if its numbers are out of range, this error.
-bool IsMismatch(int result, SignatureScheme scheme, unsigned long error) noexcept {
-  if (scheme == SignatureScheme::kEcdsa) {
-    return result == 0 && (error == 0 || (ERR_GET_LIB(error) == ERR_LIB_EC &&
-                                          ERR_GET_REASON(error) == EC_R_BAD_SIGNATURE));
+// What OpenSSL reports besides the result 0 of an ECDSA signature that does not match: nothing, an
+// error if its numbers are out of range, or, from version 3.4 on, only that it does not match.
+bool IsEcdsaMismatch(unsigned long error) noexcept {
+#ifdef EVP_R_PROVIDER_SIGNATURE_FAILURE
+  if (ERR_GET_LIB(error) == ERR_LIB_EVP &&
+      ERR_GET_REASON(error) == EVP_R_PROVIDER_SIGNATURE_FAILURE) {
+    return true;
   }
-  return IsRsaMismatch(error);
+#endif
+  return error == 0 ||
+         (ERR_GET_LIB(error) == ERR_LIB_EC && ERR_GET_REASON(error) == EC_R_BAD_SIGNATURE);
+}
+
+bool IsMismatch(int result, SignatureScheme scheme, unsigned long error) noexcept {
+  return scheme == SignatureScheme::kEcdsa ? result == 0 && IsEcdsaMismatch(error)
+                                           : IsRsaMismatch(error);
 }
 
 // A failure of OpenSSL says nothing about the signature.
