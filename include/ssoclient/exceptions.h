@@ -23,8 +23,8 @@ class SSOCLIENT_EXPORT SsoException : public Tarnik::Exception {
   [[noreturn]] void Throw() const override { throw SsoException(*this); }
 };
 
-/// The exchange with the service failed: connection, TLS, timeout, or an HTTP status other than 2xx
-/// and 500.
+/// The exchange with the service failed: connection, TLS, time-out, the end of the process, or an
+/// HTTP status other than 2xx and 500.
 class SSOCLIENT_EXPORT CommunicationException : public SsoException {
  public:
   explicit CommunicationException(std::string message,
