@@ -25,6 +25,9 @@ int main(int argc, char** argv) {
     std::string host;
     int port = 0;
     Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, config.url);
+    if (!isHttps) {
+      throw std::runtime_error("the URL must begin with https");
+    }
     const auto spec = Tarnik::Http::CreateTLSConnectionSpec(host, port, sslContext.get(), "");
     config.userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
     config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
