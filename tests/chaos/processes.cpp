@@ -7,7 +7,8 @@
 #include "chaos/campaigns.h"
 #include "chaos/peer.h"
 #include "chaos/process_state.h"
-#include "integration/probe_run.h"
+#include "support/child_process.h"
+#include "support/temporary_file.h"
 
 namespace SsoClient::Testing {
 namespace {
@@ -16,8 +17,8 @@ using namespace std::chrono_literals;
 
 /// Runs a program that ends with status 0, and kills it when it has not ended after 50 seconds.
 void RunProgram(const Run& run, std::vector<std::string> command, bool isLeakCheckOff) {
-  command.insert(command.begin(), {"/usr/bin/timeout", "--signal=KILL", "50"});
-  const int status = RunToEnd(std::move(command), isLeakCheckOff);
+  const int status = Tarnik::Testing::RunToEnd(std::move(command),
+                                               {.limit = 50s, .isLeakCheckOff = isLeakCheckOff});
   run.Require(status == 0, "the program ended with status " + std::to_string(status));
 }
 
@@ -26,8 +27,8 @@ struct ProbeFiles {
   explicit ProbeFiles(const DevSts::Server& sts)
       : ca(sts.CaCertificatePem()), signing(sts.SigningCertificatePem()) {}
 
-  const TemporaryFile ca;
-  const TemporaryFile signing;
+  const Tarnik::Testing::TemporaryFile ca;
+  const Tarnik::Testing::TemporaryFile signing;
 };
 
 struct Scenario {

@@ -2,11 +2,14 @@
 
 #include <gtest/gtest.h>
 
-#include "integration/probe_run.h"
 #include "integration/sts_fixture.h"
+#include "support/child_process.h"
+#include "support/temporary_file.h"
 
 namespace SsoClient::Testing {
 namespace {
+
+using Tarnik::Testing::TemporaryFile;
 
 // The threads of the parent that are inside calls. The allocator of AddressSanitizer remains locked
 // in a child when another thread allocates during the fork, so there the parent's threads are idle.
@@ -23,9 +26,10 @@ class ForkTest : public StsTest {
   static int RunProbe(const std::string& scenario, int forks) {
     const TemporaryFile ca(Sts().CaCertificatePem());
     const TemporaryFile signing(Sts().SigningCertificatePem());
-    return RunToEnd({FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(),
-                     std::to_string(forks), std::to_string(kThreads)},
-                    /*isLeakCheckOff=*/true);
+    return Tarnik::Testing::RunToEnd(
+        {FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(), std::to_string(forks),
+         std::to_string(kThreads)},
+        {.isLeakCheckOff = true});
   }
 };
 

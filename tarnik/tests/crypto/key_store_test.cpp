@@ -1,5 +1,4 @@
 #include <filesystem>
-#include <fstream>
 #include <stdexcept>
 #include <string>
 
@@ -9,9 +8,9 @@
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/crypto/private_key.h>
 
-#include "support/ca_folder.h"
 #include "support/key_texts.h"
 #include "support/openssl.h"
+#include "support/temporary_file.h"
 #include "support/test_certificates.h"
 #include "support/test_pki.h"
 #include "support/thrown_message.h"
@@ -98,9 +97,8 @@ TEST(KeyStoreTest, RefusesAMissingFile) {
 }
 
 TEST(KeyStoreTest, RefusesAFolder) {
-  const CaFolder folder;
-  const std::string file = folder.Path() + "/key.pem";
-  std::ofstream(file) << ToPkcs8Pem(SharedRsaKey());
+  const TemporaryFolder folder;
+  const std::string file = folder.Write("key.pem", ToPkcs8Pem(SharedRsaKey()));
   EXPECT_TRUE(IsShared(LoadPrivateKeyFromUri("file:" + file)));
   for (const std::string scheme : {"file:", "file://", "FILE://LocalHost"}) {
     const std::string name = scheme.substr(0, scheme.find(':') + 1);
@@ -120,16 +118,16 @@ TEST(KeyStoreTest, RefusesAFileOfAnotherHost) {
 
 // OpenSSL would read it, in a descriptor that child processes inherit.
 TEST(KeyStoreTest, ReadsNoFileWhoseNameIsTheUri) {
-  const CaFolder folder;
+  const TemporaryFolder folder;
   const WorkingFolder working(folder.Path());
   for (const char* const name : {"file:key.pem", "vault:key.pem"}) {
-    std::ofstream(name) << ToPkcs8Pem(SharedRsaKey());
+    folder.Write(name, ToPkcs8Pem(SharedRsaKey()));
   }
   EXPECT_EQ(LoadError("file:key.pem"),
             "The URI 'file:' gives no private key: No such file or directory.");
   EXPECT_EQ(LoadError("vault:key.pem"),
             "The URI 'vault:' gives no private key: a file has the URI as its name.");
-  std::ofstream("key.pem") << ToPkcs8Pem(SharedRsaKey());
+  folder.Write("key.pem", ToPkcs8Pem(SharedRsaKey()));
   EXPECT_TRUE(IsShared(LoadPrivateKeyFromUri("file:key.pem")));
 }
 
