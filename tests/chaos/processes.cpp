@@ -7,6 +7,7 @@
 #include "chaos/campaigns.h"
 #include "chaos/peer.h"
 #include "chaos/process_state.h"
+#include "integration/holder_of_key_fixture.h"
 #include "support/child_process.h"
 #include "support/temporary_file.h"
 
@@ -54,7 +55,8 @@ constexpr int kThreadsInCalls = 0;
 constexpr int kThreadsInCalls = 32;
 #endif
 
-constexpr const char* kForks[] = {"call", "exit", "call-and-exit", "grandchildren", "callback"};
+constexpr const char* kForks[] = {"call",          "sign",          "exit",
+                                  "call-and-exit", "grandchildren", "callback"};
 
 }  // namespace
 
@@ -80,7 +82,9 @@ void RunExits(Run& run) {
 
 void RunForks(Run& run) {
   DevSts::Server sts;
+  sts.RegisterCertificate(kMachine, Holder().certificatePem);
   const ProbeFiles files(sts);
+  const Tarnik::Testing::TemporaryFile holder(Holder().certificatePem + Holder().privateKeyPem);
   const ProcessState before = ProcessState::Settled();
   while (run.HasTime()) {
     const std::string scenario = run.OneOf(kForks);
@@ -88,7 +92,7 @@ void RunForks(Run& run) {
     run.Begin(scenario + ", " + std::to_string(forks) + " forks");
     RunProgram(run,
                {FORK_PROBE, scenario, sts.HttpsUrl(), files.ca.Path(), files.signing.Path(),
-                std::to_string(forks), std::to_string(kThreadsInCalls)},
+                holder.Path(), std::to_string(forks), std::to_string(kThreadsInCalls)},
                /*isLeakCheckOff=*/true);
   }
   RequireState(run, before, run.IsLong());

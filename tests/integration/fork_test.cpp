@@ -2,7 +2,7 @@
 
 #include <gtest/gtest.h>
 
-#include "integration/sts_fixture.h"
+#include "integration/holder_of_key_fixture.h"
 #include "support/child_process.h"
 #include "support/temporary_file.h"
 
@@ -21,20 +21,25 @@ constexpr int kThreads = 32;
 
 // The STS is in this process and the calls are in the probe's, so that only the libraries of the
 // probe are forked.
-class ForkTest : public StsTest {
+class ForkTest : public HolderOfKeyTest {
  protected:
   static int RunProbe(const std::string& scenario, int forks) {
     const TemporaryFile ca(Sts().CaCertificatePem());
     const TemporaryFile signing(Sts().SigningCertificatePem());
+    const TemporaryFile holder(Holder().certificatePem + Holder().privateKeyPem);
     return Tarnik::Testing::RunToEnd(
-        {FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(), std::to_string(forks),
-         std::to_string(kThreads)},
+        {FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(), holder.Path(),
+         std::to_string(forks), std::to_string(kThreads)},
         {.isLeakCheckOff = true});
   }
 };
 
 TEST_F(ForkTest, ChildOfAProcessWithCallsUnderWayCanCall) {
   EXPECT_EQ(RunProbe("call", 25), 0);
+}
+
+TEST_F(ForkTest, ChildOfAProcessThatIsSigningCanAcquireByCertificateAndRenew) {
+  EXPECT_EQ(RunProbe("sign", 10), 0);
 }
 
 TEST_F(ForkTest, ChildOfAProcessWithCallsUnderWayCanExit) {
