@@ -105,7 +105,7 @@ TEST(NameCharsTest, CanAllBeReadByTheParser) {
   EXPECT_GT(count, 30'000U);
 }
 
-// Around each end of a range, and so that a document with the name is read if it can be built.
+// Around each end of a range: a name that can be built can be read, and the other way round.
 TEST(NameCharsTest, AreTheOnlyOnesThatTheParserReads) {
   for (char32_t character = 0x7F; character <= 0x10001; ++character) {
     const bool isEnd = IsNameStart(character) != IsNameStart(character - 1) ||
