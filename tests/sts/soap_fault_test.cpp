@@ -75,6 +75,18 @@ TEST(SoapFaultTest, CodesOfRejectedCredentials) {
   }
 }
 
+// XML Schema Part 2, section 4.3.6: white space around a QName is not part of it.
+TEST(SoapFaultTest, CodesMayHaveWhiteSpaceAroundThem) {
+  for (const std::string code : {"\n      wst:FailedAuthentication\n    ",
+                                 "wst:FailedAuthentication\t", " wsse:InvalidSecurityToken"}) {
+    EXPECT_EQ(ThrownFor(Envelope(Fault(code, "no entry"))),
+              Expect<InvalidCredentialsException>("Authentication failed: no entry"))
+        << code;
+  }
+  EXPECT_EQ(ThrownFor(Envelope(Fault(" wst:FailedAuthentication ", kExpired))),
+            Expect<PasswordExpiredException>("Authentication failed: " + std::string(kExpired)));
+}
+
 TEST(SoapFaultTest, CodesAreComparedByTheirNamespace) {
   const std::string foreign =
       R"(<faultcode xmlns:f="http://docs.oasis-open.org/ws-sx/ws-trust/200512">)"
@@ -92,7 +104,7 @@ TEST(SoapFaultTest, AnyOtherCodeIsReportedAsReceived) {
   for (const std::string code :
        {"wsse:FailedAuthentication", "S:Server", "wst:InvalidRequest", "wst:failedauthentication",
         "wst:FailedAuthentication2", "FailedAuthentication", "InvalidSecurityToken",
-        "wst:FailedAuthentication ", "wst:a:b"}) {
+        "wst:Failed Authentication", "wst:a:b", " S:Server\n"}) {
     EXPECT_EQ(ThrownFor(Envelope(Fault(code, std::string(kExpired)))),
               Expect<SsoException>("Unexpected SOAP fault: " + code + "; request failed."));
   }

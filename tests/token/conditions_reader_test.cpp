@@ -126,6 +126,13 @@ TEST(ReadConditionsTest, IdentifiesConditionsByTheTypesExpandedName) {
   EXPECT_FALSE(conditions.renewRestriction->renewExpired);
 }
 
+TEST(ReadConditionsTest, ReadsTheTypeWithoutTheWhiteSpaceAroundIt) {
+  const std::string padded = Replaced(kRenew, "\"rsa:Renew", "\"&#10; rsa:Renew");
+  EXPECT_TRUE(Read(padded).renewRestriction.has_value());
+  EXPECT_EQ(Refusal(padded + kRenew), kUnknownOrDuplicate);
+  EXPECT_EQ(Refusal(Replaced(kRenew, "rsa:Renew", "rsa: Renew")), kUnknownOrDuplicate);
+}
+
 TEST(ReadConditionsTest, RefusesMissingOrBrokenTimes) {
   const std::string text = ConditionsText("");
   const std::tuple<const char*, const char*, const char*> cases[] = {

@@ -148,21 +148,6 @@ TEST(CheckEachAttributeTest, NamesTheUnexpectedOne) {
             "Unexpected attribute 'saml2:Count' on element 'saml2:A'");
 }
 
-TEST(CheckTypeIsNameableTest, AcceptsNoTypeAndTypesOfBoundPrefixes) {
-  for (const char* content :
-       {"<saml2:A/>", R"(<saml2:A xsi:type="xs:string"/>)", R"(<saml2:A xsi:type="string"/>)",
-        R"(<saml2:A type="no:string"/>)"}) {
-    const Fragment fragment(content);
-    EXPECT_NO_THROW(CheckTypeIsNameable(fragment.Element())) << content;
-  }
-}
-
-TEST(CheckTypeIsNameableTest, RejectsATypeOfAnUnboundPrefix) {
-  const Fragment fragment("\n<saml2:A xsi:type=\"no:string\"/>");
-  EXPECT_EQ(ThrownMessage<ParseException>([&] { CheckTypeIsNameable(fragment.Element()); }),
-            "Element saml2:Aat 2,1 uses undefined prefix: `no'");
-}
-
 TEST(ReadAttributeTest, ReturnsTheValueOrNamesTheMissingOne) {
   const Fragment fragment(R"(<saml2:A a="x &amp; y"/>)");
   EXPECT_EQ(ReadAttribute(fragment.Element(), "a"), "x & y");

@@ -39,6 +39,7 @@ struct TransformPlan {
 
 /// Accepts enveloped-signature and then one canonicalisation, both optional. Without a
 /// canonicalisation the reference uses Canonical XML 1.0 (XML Signature 1.1, section 4.4.3.2).
+/// enveloped-signature may have one InclusiveNamespaces element, which has no effect there.
 TransformPlan PlanTransforms(const std::vector<std::string>& algorithms,
                              const std::vector<const ElementNode*>& elements);
 

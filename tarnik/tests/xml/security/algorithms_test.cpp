@@ -203,6 +203,67 @@ TEST(AlgorithmParametersTest, OfTheExclusiveMethodAreOnePrefixList) {
             "refused: Element 'c:InclusiveNamespaces' holds the unexpected element 'x'.");
 }
 
+std::string WithParameterOfEnveloped(const std::string& content) {
+  SignatureTemplate signature;
+  signature.transforms = Replaced(signature.transforms, "enveloped-signature\"/>",
+                                  "enveloped-signature\">" + content + "</ds:Transform>");
+  return signature.Text();
+}
+
+// Some signers repeat the prefix list of the canonicalisation in every transform, in the namespace
+// of the canonicalisation or in one that is named after the transform.
+TEST(AlgorithmParametersTest, OfEnvelopedMayBeAPrefixListWithoutEffect) {
+  for (const char* uri : {"http://www.w3.org/2001/10/xml-exc-c14n#",
+                          "http://www.w3.org/2000/09/xmldsig#enveloped-signature"}) {
+    for (const char* list : {"", " PrefixList=\"\"", " PrefixList=\"xs unbound #default\""}) {
+      const std::string parameter =
+          std::string("\n<i:InclusiveNamespaces xmlns:i=\"") + uri + "\"" + list + "/>";
+      const std::string text =
+          Signed({}, AssertionWith(WithParameterOfEnveloped(parameter), "<b/>"));
+      EXPECT_EQ(Verdict(text), "valid") << parameter;
+      EXPECT_EQ(Verdict(Replaced(text, "user@example", "root@example")), "invalid") << parameter;
+    }
+  }
+}
+
+// The oracle accepts these signatures too, so that only the rules for parameters can be the reason.
+TEST(AlgorithmParametersTest, OfEnvelopedMayBeNothingElse) {
+  const std::string list =
+      "<i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>";
+  const auto verdict = [](const std::string& parameter) {
+    return Verdict(Signed({}, AssertionWith(WithParameterOfEnveloped(parameter))));
+  };
+  const auto takesNo = [](const std::string& name) {
+    return "refused: The algorithm 'http://www.w3.org/2000/09/xmldsig#enveloped-signature' takes "
+           "no parameters, but has '" +
+           name + "'.";
+  };
+  EXPECT_EQ(verdict(list), "valid");
+  EXPECT_EQ(verdict(list + list),
+            "refused: Element 'ds:Transform' holds the unexpected element "
+            "'i:InclusiveNamespaces'.");
+  EXPECT_EQ(verdict(list + "<x/>"),
+            "refused: Element 'ds:Transform' holds the unexpected element 'x'.");
+  EXPECT_EQ(verdict(Replaced(list, "/>", " Prefix=\"\"/>")),
+            "refused: Element 'i:InclusiveNamespaces' has the unexpected attribute 'Prefix'.");
+  EXPECT_EQ(verdict(Replaced(list, "/>", "><x/></i:InclusiveNamespaces>")),
+            "refused: Element 'i:InclusiveNamespaces' holds the unexpected element 'x'.");
+  EXPECT_EQ(verdict("<ds:XPath>false()</ds:XPath>"), takesNo("ds:XPath"));
+  EXPECT_EQ(verdict("<InclusiveNamespaces/>"), takesNo("InclusiveNamespaces"));
+  EXPECT_EQ(verdict("<ds:InclusiveNamespaces/>"), takesNo("ds:InclusiveNamespaces"));
+  EXPECT_EQ(verdict(Replaced(list, "InclusiveNamespaces", "inclusivenamespaces")),
+            takesNo("i:inclusivenamespaces"));
+}
+
+// The namespace of the transform is not one of the canonicalisation's parameters.
+TEST(AlgorithmParametersTest, OfTheExclusiveMethodAreInItsOwnNamespace) {
+  const std::string list =
+      "<i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2000/09/xmldsig#enveloped-signature\"/>";
+  EXPECT_EQ(Verdict(WithPrefixList(list)),
+            "refused: The algorithm 'http://www.w3.org/2001/10/xml-exc-c14n#' does not take "
+            "'i:InclusiveNamespaces' as a parameter.");
+}
+
 TEST(AlgorithmParametersTest, PrefixListsAreSplitAtWhiteSpace) {
   const auto document = ParseXml(
       "<t><i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2001/10/xml-exc-c14n#\" "

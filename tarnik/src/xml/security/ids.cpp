@@ -1,0 +1,15 @@
+#include <tarnik/xml/security/ids.h>
+
+#include "support/ascii.h"
+#include "xml/security/content_reader.h"
+
+namespace Tarnik::Xml::Security {
+
+std::optional<std::string_view> PossibleId(const Attribute& attribute) noexcept {
+  if (!EqualsIgnoringCase(attribute.Qualified().Local(), "id")) {
+    return std::nullopt;
+  }
+  return Trim(attribute.Value());
+}
+
+}  // namespace Tarnik::Xml::Security
