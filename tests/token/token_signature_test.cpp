@@ -70,6 +70,14 @@ TEST(ReadSignatureTest, RefusesReferencesToElsewhere) {
             "Token's signature must cover the entire token");
 }
 
+// The reference "#" is "#" followed by the empty id. Such a token is refused for its id.
+TEST(ReadSignatureTest, AcceptsTheEmptyFragmentOnlyForAnEmptyId) {
+  Fragment fragment(MadeUpSignature("#"));
+  EXPECT_NE(ReadSignature(fragment.Cursor(), ""), nullptr);
+  EXPECT_EQ(Refusal(MadeUpSignature("#_a1"), ""), "Token's signature must cover the entire token");
+  EXPECT_EQ(Refusal(MadeUpSignature("#"), "_"), "Token's signature must cover the entire token");
+}
+
 TEST(ReadSignatureTest, RefusesAnythingButAnElementInItsPlace) {
   for (const char* content : {"", "text", "<?pi?>", " <!--c--> "}) {
     EXPECT_EQ(Refusal(content), "Expected element ds:Signature not found");
