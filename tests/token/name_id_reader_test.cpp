@@ -144,9 +144,12 @@ TEST(PrincipalFromNameIdTest, RejectsOtherFormat) {
             "Invalid or unsupported NameId format 'urn:other");
   EXPECT_EQ(ThrownMessage<ParseException>([] { PrincipalFromNameId("", "a@b"); }),
             "Invalid or unsupported NameId format '");
-  EXPECT_EQ(ThrownMessage<ParseException>(
-                [] { PrincipalFromNameId("http://schemas.xmlsoap.org/claims/upn", "a@b"); }),
-            "Invalid or unsupported NameId format 'http://schemas.xmlsoap.org/claims/upn");
+  for (const std::string format :
+       {"http://schemas.xmlsoap.org/claims/upn", "http://schemas.xmlsoap.org/claims/UPN ",
+        "http://schemas.xmlsoap.org/claims/UPN2", "http://schemas.xmlsoap.org/claims/UP"}) {
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { PrincipalFromNameId(format, "a@b"); }),
+              "Invalid or unsupported NameId format '" + format);
+  }
 }
 
 TEST(PrincipalFromNameIdTest, ChecksTheFormatBeforeTheValue) {
