@@ -67,10 +67,10 @@ TEST(ReadPrincipalTest, ReadsAUserPrincipalName) {
 TEST(ReadPrincipalTest, KeepsBlanks) {
   Fragment fragment(
       "<saml2:NameID Format=\"http://schemas.xmlsoap.org/claims/UPN\">\n a b @ c "
-      "\t</saml2:NameID>");
+      "\t </saml2:NameID>");
   const PrincipalId principal = ReadPrincipal(fragment.Cursor());
   EXPECT_EQ(principal.name, "\n a b ");
-  EXPECT_EQ(principal.domain, " c \t");
+  EXPECT_EQ(principal.domain, " c \t ");
 }
 
 TEST(ReadPrincipalTest, ReportsTheFirstOfTwoFaults) {

@@ -99,6 +99,13 @@ TEST_F(TrustedCertificatesResolverTest, FindsBySubjectName) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
+TEST_F(TrustedCertificatesResolverTest, CountsACertificateThatIsGivenTwiceOnce) {
+  const auto resolver = CreateTrustedCertificatesResolver({first_, second_, first_});
+  KeyInfo keyInfo;
+  keyInfo.subjectNames = {first_->SubjectName()};
+  EXPECT_EQ(resolver->Resolve(keyInfo), first_->GetPublicKey());
+}
+
 TEST_F(TrustedCertificatesResolverTest, ReturnsNoKeyWhenAHintNamesSeveralCertificates) {
   KeyInfo keyInfo;
   keyInfo.subjectNames = {first_->SubjectName(), second_->SubjectName()};
