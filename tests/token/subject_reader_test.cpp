@@ -230,7 +230,9 @@ TEST(ReadSubjectTest, ReportsTheFirstOfTwoFaultsInTheSubject) {
       {"<saml2:SubjectConfirmation Method=\"m\"/>", "Unknown subject confirmation method: 'm'"},
       {bearer + Replaced(kNameId, "a@b", "ab") + "<saml2:SubjectConfirmationData/>" + end,
        "Failed to parse the UPN NameID: `ab'; name or domain part is missing."},
-      {bearer + kNameId + kNameId + end, "Expected element 'SubjectConfirmationData' not found."},
+      {bearer + kNameId + kNameId +
+           R"(<saml2:SubjectConfirmationData NotOnOrAfter="2024-03-05T08:00:00Z"/>)" + end,
+       "Expected element 'SubjectConfirmationData' not found."},
       {bearer + "<saml2:SubjectConfirmationData/><x/>" + end + "<y/>",
        "Node 'saml2:SubjectConfirmationData is missing required attribute 'NotOnOrAfter'"}};
   for (const auto& [confirmation, message] : cases) {

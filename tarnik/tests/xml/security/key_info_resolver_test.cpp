@@ -148,6 +148,13 @@ TEST_F(CertificateIssuerResolverTest, FindsByTheIssuerOfAnEmbeddedCertificate) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
+TEST_F(CertificateIssuerResolverTest, IgnoresACertificateNextToANamedIssuer) {
+  KeyInfo keyInfo;
+  keyInfo.issuerSerials = {{second_->IssuerName(), "2"}};
+  keyInfo.certificates = {DerOf(first_)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
+}
+
 TEST_F(CertificateIssuerResolverTest, ReturnsTheTrustedKeyForAStrangerWithTheSameIssuer) {
   const auto namesake = MakeCertificate(
       {.key = otherKey_.get(), .commonName = "first", .issuerCommonName = "ca", .serial = "1"});
