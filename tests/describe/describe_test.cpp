@@ -94,6 +94,8 @@ TEST(DescribeTest, WritesDelegateWithItsInstant) {
   const DateTime instant = DateTime::Parse("2024-03-05T07:08:09.010Z");
   EXPECT_EQ(Describe(Delegate{{"bob", "CORP"}, instant}),
             "{Name: bob; Domain:CORP} at 2024-03-05T07:08:09.010Z");
+  EXPECT_EQ(Describe(Delegate{{"bob", "CORP"}, DateTime::Parse("2024-03-05T09:08:09+02:00")}),
+            "{Name: bob; Domain:CORP} at 2024-03-05T09:08:09.000+02:00");
 }
 
 TEST(DescribeTest, JoinsAttributeValuesByPosition) {
