@@ -202,7 +202,7 @@ class TokenWithoutSubject {
   TokenWithoutSubject() {
     constexpr std::size_t kSubjectSlot = 4;
     void* const* table = nullptr;
-    std::memcpy(&table, &token_, sizeof table);
+    std::memcpy(&table, static_cast<const void*>(&token_), sizeof table);
     std::memcpy(table_.data(), table - kEntriesBefore, sizeof table_);
     table_[kEntriesBefore + kSubjectSlot] = reinterpret_cast<void*>(&NoSubject);
     table = table_.data() + kEntriesBefore;
