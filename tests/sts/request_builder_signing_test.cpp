@@ -146,6 +146,24 @@ TEST(RequestSigningOrderTest, ABearerTokenIsNotRenewedWhateverTheKey) {
       kNoKeyForRenewal);
 }
 
+TEST(RequestSigningOrderTest, TheTokensTextIsReadLast) {
+  FakeSamlToken broken("<A>");
+  SoapRequest request;
+  const RequestBuilderImpl withoutKey(boost::none);
+  EXPECT_EQ(ThrownMessage<InvalidStateException>(
+                [&] { withoutKey.BuildAcquireTokenByTokenRequest(broken, SpecOf(60), request); }),
+            "No HolderOfKeyConfig provided. Unable to acquire token by token");
+  EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
+                [&] { BuilderWithKey().BuildRenewRequest(broken, 60, request); }),
+            "Unable to renew token: the provided token must be Holder Of Key");
+  broken.confirmationType = HOLDER_OF_KEY;
+  EXPECT_EQ(ThrownMessage<InvalidStateException>(
+                [&] { withoutKey.BuildRenewRequest(broken, 60, request); }),
+            kNoKeyForRenewal);
+  EXPECT_THROW(BuilderWithKey().BuildRenewRequest(broken, 60, request),
+               Tarnik::Xml::XMLParseException);
+}
+
 TEST(RequestSigningOrderTest, TheConfirmationOfAPresentedTokenIsNotExamined) {
   SoapRequest request;
   BuilderWithKey().BuildAcquireTokenByTokenRequest(PresentedToken(BEARER), SpecOf(60), request);

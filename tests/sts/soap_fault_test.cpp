@@ -172,5 +172,35 @@ TEST(SoapFaultTest, TheFaultStringOfARefusedTimestampIsLogged) {
                                                    line + std::string(1000, 'x') + "..."}));
 }
 
+TEST(SoapFaultTest, TheFaultStringIsLoggedForEveryCodeOfARefusedTimestamp) {
+  const LogCapture log(4);
+  const std::string wsu = R"( xmlns:wsu="http://docs.oasis-open.org/wss/2004/01/)"
+                          R"(oasis-200401-wss-wssecurity-utility-1.0.xsd")";
+  for (const std::string code :
+       {"wsu:MessageExpired", "wsse:MessageExpired", "wsse:InvalidSecurity", "wsu:InvalidSecurity",
+        "wst:MessageExpired", "wsse:messageexpired"}) {
+    const std::string fault = "<faultcode" + wsu + ">" + code + "</faultcode>";
+    EXPECT_EQ(ThrownFor(Envelope(Fault(fault + "<faultstring>late</faultstring>"))),
+              Expect<SsoException>("Unexpected SOAP fault: " + code + "; request failed."));
+  }
+  const std::string line = "4 The service answered with fault `";
+  EXPECT_EQ(log.Lines(), (std::vector<std::string>{line + "wsu:MessageExpired': late",
+                                                   line + "wsse:MessageExpired': late",
+                                                   line + "wsse:InvalidSecurity': late"}));
+}
+
+TEST(SoapFaultTest, ALongFaultCodeIsLoggedInPart) {
+  const LogCapture log(4);
+  const std::string prefix(2000, 'p');
+  const std::string code = prefix + ":InvalidSecurity";
+  EXPECT_EQ(ThrownFor(Envelope(Fault("<faultcode xmlns:" + prefix +
+                                     R"(="http://docs.oasis-open.org/wss/2004/01/)"
+                                     R"(oasis-200401-wss-wssecurity-secext-1.0.xsd">)" +
+                                     code + "</faultcode><faultstring>late</faultstring>"))),
+            Expect<SsoException>("Unexpected SOAP fault: " + code + "; request failed."));
+  EXPECT_EQ(log.Lines(), (std::vector<std::string>{"4 The service answered with fault `" +
+                                                   prefix.substr(0, 1000) + "...': late"}));
+}
+
 }  // namespace
 }  // namespace SsoClient::Testing

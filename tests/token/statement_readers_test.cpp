@@ -101,6 +101,24 @@ TEST(ReadSamlAttributeTest, DoesNotReadTheTypesOfValues) {
   }
 }
 
+TEST(ReadSamlAttributeTest, ReportsTheFirstOfTwoFaults) {
+  const std::pair<const char*, const char*> cases[] = {
+      {R"(<saml2:Attribute x=""/>)", "Node 'saml2:Attribute is missing required attribute 'Name'"},
+      {R"(<saml2:Attribute Name="n" x=""><y/></saml2:Attribute>)",
+       "Unexpected attributes on element 'saml2:Attribute'"},
+      {R"(<saml2:Attribute Name="n"><saml2:AttributeValue x=""><y/></saml2:AttributeValue>)"
+       R"(</saml2:Attribute>)",
+       "Unexpected attribute 'x' on element 'saml2:AttributeValue'"},
+      {R"(<saml2:Attribute Name="n"><saml2:AttributeValue><y/></saml2:AttributeValue><x/>)"
+       R"(</saml2:Attribute>)",
+       kTextOnly}};
+  for (const auto& [content, message] : cases) {
+    Fragment fragment(content);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadSamlAttribute(fragment.Cursor()); }), message)
+        << content;
+  }
+}
+
 using Values = std::vector<std::string>;
 
 constexpr char kGivenName[] = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/givenname";
@@ -194,12 +212,16 @@ TEST(ReadAttributeStatementTest, LeavesNamesEmptyWithoutValue) {
 }
 
 TEST(ReadAttributeStatementTest, UsesTheLastNames) {
-  EXPECT_EQ(ReadAttributes(AttributeText(kSurname, {"a"}) + AttributeText(kSurname, {"b", "c"}))
-                .names.surname,
-            "b");
-  EXPECT_EQ(
-      ReadAttributes(AttributeText(kSurname, {"a"}) + AttributeText(kSurname, {})).names.surname,
-      "");
+  const auto names = [](const Values& first, const Values& second) {
+    return ReadAttributes(AttributeText(kGivenName, first) + AttributeText(kSurname, first) +
+                          AttributeText(kGivenName, second) + AttributeText(kSurname, second))
+        .names;
+  };
+  EXPECT_EQ(names({"a"}, {"b", "c"}).givenName, "b");
+  EXPECT_EQ(names({"a"}, {"b", "c"}).surname, "b");
+  // An attribute without values resets the name.
+  EXPECT_EQ(names({"a"}, {}).givenName, "");
+  EXPECT_EQ(names({"a"}, {}).surname, "");
 }
 
 TEST(ReadAttributeStatementTest, IgnoresAttributesOfOtherNames) {
@@ -247,6 +269,20 @@ TEST(ReadAttributeStatementTest, EnforcesTheReadingRules) {
   Fragment space("<ds:AttributeStatement/>");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadAttributeStatement(space.Cursor()); }),
             "Element 'ds:AttributeStatement' has unexpected namespace");
+}
+
+// Each attribute is applied before the next one is read.
+TEST(ReadAttributeStatementTest, ReportsTheFirstOfTwoFaults) {
+  EXPECT_EQ(AttributesRefusal(AttributeText(kIsSolutionAttribute, {}) + "<x/>"),
+            "No value found for attribute isSolution.");
+  EXPECT_EQ(AttributesRefusal(AttributeText(kGroupIdentityAttribute, {"staff"}) +
+                              AttributeText(kIsSolutionAttribute, {})),
+            "Failed to parse Group Identity value: `staff'; domain or group missing");
+  EXPECT_EQ(AttributesRefusal(AttributeText(kIsSolutionAttribute, {"true", "true", "<x/>"})),
+            kTextOnly);
+  Fragment both("<saml2:AttributeStatement x=\"\"><y/></saml2:AttributeStatement>");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadAttributeStatement(both.Cursor()); }),
+            "Unexpected attributes on element 'saml2:AttributeStatement'");
 }
 
 // A parsed element without characters has no text child, but an element of a tree that was built
@@ -314,6 +350,42 @@ TEST(ReadAuthnStatementTest, EnforcesTheReadingRules) {
             "Expected element 'AuthnContextClassRef' not found.");
   EXPECT_EQ(AuthnRefusal("<ds:AuthnStatement/>"),
             "Element 'ds:AuthnStatement' has unexpected namespace");
+}
+
+TEST(ReadAuthnStatementTest, RefusesAMissingChild) {
+  EXPECT_EQ(AuthnRefusal(R"(<saml2:AuthnStatement AuthnInstant="2024-03-05T07:08:09Z"/>)"),
+            "Expected element 'AuthnContext' not found.");
+  EXPECT_EQ(AuthnRefusal(R"(<saml2:AuthnStatement AuthnInstant="2024-03-05T07:08:09Z">)"
+                         R"(<saml2:AuthnContext/></saml2:AuthnStatement>)"),
+            "Expected element 'AuthnContextClassRef' not found.");
+}
+
+TEST(ReadAuthnStatementTest, ReportsTheFirstOfTwoFaults) {
+  const std::string good = R"(AuthnInstant="2024-03-05T07:08:09Z")";
+  const std::string context = "<saml2:AuthnContext>";
+  const std::pair<std::string, std::string> attributes[] = {
+      {"x=\"\"", "Node 'saml2:AuthnStatement is missing required attribute 'AuthnInstant'"},
+      {"x=\"\" AuthnInstant=\"now\"", "Unexpected attributes on element 'saml2:AuthnStatement'"},
+      {"AuthnInstant=\"now\"", "saml2:AuthnStatement/@AuthnInstant is not a date"}};
+  for (const auto& [broken, message] : attributes) {
+    EXPECT_EQ(AuthnRefusal("<saml2:AuthnStatement " + broken + "><x/></saml2:AuthnStatement>"),
+              message);
+  }
+  const std::pair<std::string, std::string> contents[] = {
+      {"<saml2:AuthnContext x=\"\"/>", "Unexpected attributes on element 'saml2:AuthnContext'"},
+      {context + "<saml2:AuthnContextClassRef x=\"\"/></saml2:AuthnContext>",
+       "Unexpected attributes on element 'saml2:AuthnContextClassRef'"},
+      {context + "<saml2:AuthnContextClassRef/><x/></saml2:AuthnContext>",
+       "Element 'saml2:AuthnContextClassRef' must only have textual content (but has extra "
+       "children or is empty)."},
+      {context + "<saml2:AuthnContextClassRef>c</saml2:AuthnContextClassRef><x/>"
+                 "</saml2:AuthnContext><y/>",
+       "Unexpected elements after AuthnContextClassRef"}};
+  for (const auto& [broken, message] : contents) {
+    EXPECT_EQ(
+        AuthnRefusal("<saml2:AuthnStatement " + good + ">" + broken + "</saml2:AuthnStatement>"),
+        message);
+  }
 }
 
 }  // namespace

@@ -132,6 +132,20 @@ TEST(CheckEachAttributeTest, NamesTheMissingOne) {
             "Node 'saml2:A is missing required attribute 'Count'");
 }
 
+TEST(CheckEachAttributeTest, NamesTheFirstFault) {
+  const Fragment fragment(R"(<saml2:A b="" a="" xsi:nil="true"/>)");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] {
+              CheckEachAttribute(fragment.Element(), {{"", "c"}, kTypeAttribute});
+            }),
+            "Node 'saml2:A is missing required attribute 'c'");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] {
+              CheckEachAttribute(fragment.Element(), {kTypeAttribute, {"", "c"}});
+            }),
+            "Node 'saml2:A is missing required attribute 'xsi:type'");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { CheckEachAttribute(fragment.Element(), {}); }),
+            "Unexpected attribute 'b' on element 'saml2:A'");
+}
+
 TEST(CheckEachAttributeTest, NamesTheUnexpectedOne) {
   const Fragment type(R"(<saml2:A xsi:type="x" type="y"/>)");
   EXPECT_EQ(

@@ -76,6 +76,14 @@ TEST(OwnIdsTest, AcceptsOtherIdsAndOneCertificate) {
   EXPECT_EQ(ErrorMessage("<a identity=\"holderOfKeyProofSignature\"/>"), accepted);
 }
 
+TEST(OwnIdsTest, ExaminesOnlyTheElementThatIsGiven) {
+  const auto document = ParseXml(
+      "<r Id=\"holderOfKeyProofSignature\"><a><b/></a><c Id=\"holderOfKeyProofSignature\"/></r>");
+  EXPECT_NO_THROW(RejectReservedIds(*FindElement(document->RootElement(), "a")));
+  EXPECT_THROW(RejectReservedIds(*FindElement(document->RootElement(), "c")),
+               Tarnik::InvalidArgumentException);
+}
+
 TEST(OwnIdsTest, RefusesTheSignatureIdAnywhere) {
   const std::string refused =
       "A token in the request carries the id 'holderOfKeyProofSignature', which is the request's "

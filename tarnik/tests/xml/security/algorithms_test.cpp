@@ -108,6 +108,16 @@ TEST(TransformListTest, AcceptsOnlyTheSupportedCombinations) {
             "canonicalisation.");
 }
 
+TEST(TransformListTest, ComparesTheEnvelopedMethodWhole) {
+  for (const std::string& uri : {std::string(kEnveloped) + "2", std::string(kEnveloped) + " ",
+                                 std::string(kEnveloped).substr(0, 20)}) {
+    SignatureTemplate signature;
+    signature.transforms = Transforms({uri});
+    EXPECT_EQ(Verdict(AssertionWithValues(signature)),
+              "refused: The transform algorithm '" + uri + "' is not supported.");
+  }
+}
+
 // The oracle accepts the signature, so that only the list of algorithms can be the reason.
 TEST(TransformListTest, RefusesCorrectSignaturesOverXPath) {
   SignatureTemplate signature;
@@ -264,13 +274,38 @@ TEST(AlgorithmParametersTest, OfTheExclusiveMethodAreInItsOwnNamespace) {
             "'i:InclusiveNamespaces' as a parameter.");
 }
 
+TEST(AlgorithmParametersTest, OfTheExclusiveMethodHaveOneExpandedName) {
+  const std::string start =
+      "refused: The algorithm 'http://www.w3.org/2001/10/xml-exc-c14n#' does "
+      "not take ";
+  EXPECT_EQ(Verdict(WithPrefixList("<c:InclusiveNamespaces xmlns:c=\"urn:other\"/>")),
+            start + "'c:InclusiveNamespaces' as a parameter.");
+  EXPECT_EQ(Verdict(WithPrefixList(
+                "<c:Other xmlns:c=\"http://www.w3.org/2001/10/xml-exc-c14n#\" PrefixList=\"\"/>")),
+            start + "'c:Other' as a parameter.");
+}
+
+TEST(AlgorithmParametersTest, AreRefusedForTheInclusiveMethod) {
+  SignatureTemplate signature;
+  signature.transforms = Transforms({kEnveloped, kInclusive});
+  const std::string text = AssertionWithValues(signature);
+  ASSERT_EQ(Verdict(text), "invalid");
+  const std::string list =
+      "<c:InclusiveNamespaces xmlns:c=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>";
+  EXPECT_EQ(
+      Verdict(Replaced(text, "REC-xml-c14n-20010315\"/></ds:Transforms>",
+                       "REC-xml-c14n-20010315\">" + list + "</ds:Transform></ds:Transforms>")),
+      "refused: The algorithm 'http://www.w3.org/TR/2001/REC-xml-c14n-20010315' takes no "
+      "parameters, but has 'c:InclusiveNamespaces'.");
+}
+
 TEST(AlgorithmParametersTest, PrefixListsAreSplitAtWhiteSpace) {
   const auto document = ParseXml(
       "<t><i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2001/10/xml-exc-c14n#\" "
-      "PrefixList=\"  a&#10;b&#9;#default  c \"/></t>");
+      "PrefixList=\"  a&#10;b&#9;#default&#13;d  c \"/></t>");
   const C14nOptions options = LookUpCanonicalizationMethod(kExclusive, document->RootElement());
   EXPECT_TRUE(options.exclusive);
-  EXPECT_THAT(options.inclusivePrefixes, testing::ElementsAre("a", "b", "#default", "c"));
+  EXPECT_THAT(options.inclusivePrefixes, testing::ElementsAre("a", "b", "#default", "d", "c"));
 }
 
 TEST(AlgorithmsTest, BoundsAndSanitisesWhatItQuotes) {

@@ -99,6 +99,13 @@ TEST_F(TrustedCertificatesResolverTest, FindsBySubjectName) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
+TEST_F(TrustedCertificatesResolverTest, CountsACertificateThatIsGivenTwiceOnce) {
+  const auto resolver = CreateTrustedCertificatesResolver({first_, second_, first_});
+  KeyInfo keyInfo;
+  keyInfo.subjectNames = {first_->SubjectName()};
+  EXPECT_EQ(resolver->Resolve(keyInfo), first_->GetPublicKey());
+}
+
 TEST_F(TrustedCertificatesResolverTest, ReturnsNoKeyWhenAHintNamesSeveralCertificates) {
   KeyInfo keyInfo;
   keyInfo.subjectNames = {first_->SubjectName(), second_->SubjectName()};
@@ -139,6 +146,13 @@ TEST_F(CertificateIssuerResolverTest, FindsByTheIssuerOfAnEmbeddedCertificate) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
   keyInfo.certificates = {DerOf(stranger_)};
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+TEST_F(CertificateIssuerResolverTest, IgnoresACertificateNextToANamedIssuer) {
+  KeyInfo keyInfo;
+  keyInfo.issuerSerials = {{second_->IssuerName(), "2"}};
+  keyInfo.certificates = {DerOf(first_)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
 }
 
 TEST_F(CertificateIssuerResolverTest, ReturnsTheTrustedKeyForAStrangerWithTheSameIssuer) {

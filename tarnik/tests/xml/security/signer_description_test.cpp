@@ -40,6 +40,18 @@ TEST(SignerDescriptionTest, BoundsAndCleansWhatTheMessageSays) {
             "whose certificate was issued by 'CN=sts' with the serial number '12'");
 }
 
+TEST(SignerDescriptionTest, BoundsEveryHint) {
+  const std::string name = "'" + std::string(256, 'x') + "...'";
+  KeyInfo keyInfo;
+  keyInfo.keyNames = {std::string(257, 'x')};
+  EXPECT_EQ(DescribeSigner(keyInfo), "whose key is named " + name);
+  keyInfo.subjectNames = {std::string(257, 'x')};
+  EXPECT_EQ(DescribeSigner(keyInfo), "whose certificate is of " + name);
+  keyInfo.subjectKeyIdentifiers = {std::vector<unsigned char>(32, 0x11)};
+  EXPECT_EQ(DescribeSigner(keyInfo),
+            "whose signer has the subject key identifier '" + std::string(64, '1') + "'");
+}
+
 TEST(SignerDescriptionTest, NamesTheOtherHints) {
   KeyInfo keyInfo;
   EXPECT_EQ(DescribeSigner(keyInfo), "which names no signer");
