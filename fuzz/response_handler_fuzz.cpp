@@ -14,6 +14,7 @@
 #include "input.h"
 #include "sts/response_handler.h"
 #include "xml_input.h"
+#include "xml_mutator.h"
 #include "xml_tree.h"
 
 namespace {
@@ -122,6 +123,11 @@ void RequireResults(const std::string& xml, const Answer& answer, const xmlNode*
 }
 
 }  // namespace
+
+extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
+                                               std::size_t maxSize, unsigned seed) {
+  return Fuzz::MutateXml(data, size, maxSize, seed);
+}
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   const std::string text = Fuzz::TextOf(data, size);

@@ -8,6 +8,7 @@
 #include <tarnik/xml/security/xml_security_exception.h>
 
 #include "input.h"
+#include "signature_model.h"
 #include "xml_tree.h"
 
 namespace Fuzz {
@@ -75,7 +76,7 @@ Xml::ElementNode* SignatureOf(const Xml::Document& document) {
   return nullptr;
 }
 
-bool IsSignature(const Xml::Document& document) {
+bool IsReadAsSignature(const Xml::Document& document) {
   try {
     Xml::Security::CreateSignatureFromDom(SignatureOf(document));
     return true;
@@ -84,13 +85,21 @@ bool IsSignature(const Xml::Document& document) {
   }
 }
 
+bool IsSignature(const xmlNode* element, const Xml::Document& document) {
+  const bool isRead = IsReadAsSignature(document);
+  const bool isShaped = IsSignatureShaped(element);
+  Require(isShaped || !isRead);
+  Require(isRead || !isShaped || ChildElement(element, "KeyInfo") != nullptr);
+  return isRead;
+}
+
 }  // namespace
 
 std::optional<ModelToken> ReadByModel(const std::string& text, const Xml::Document& document) {
   const XmlTree tree = ParseByLibXml2(text);
   Require(tree != nullptr);
   return ReadToken(xmlDocGetRootElement(tree.get()),
-                   [&document](const xmlNode*) { return IsSignature(document); });
+                   [&document](const xmlNode* element) { return IsSignature(element, document); });
 }
 
 void RequireValues(const SsoClient::SamlToken& token, const ModelToken& model) {

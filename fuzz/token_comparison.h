@@ -14,8 +14,8 @@ namespace Fuzz {
 /// The token that the model reads in a text that the parser accepts. Crashes the process if libxml2
 /// refuses the text.
 ///
-/// The one thing that the library itself decides here is the structure of ds:Signature, with
-/// `CreateSignatureFromDom`; another fuzzer compares signatures with xmlsec1.
+/// The one thing that the library itself decides here is what the ds:KeyInfo of the signature may
+/// hold: tokens do not depend on it until they are verified, and many kinds of content are skipped.
 std::optional<ModelToken> ReadByModel(const std::string& text,
                                       const Tarnik::Xml::Document& document);
 

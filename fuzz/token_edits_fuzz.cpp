@@ -19,6 +19,7 @@
 #include "support/token_editor.h"
 #include "support/token_values.h"
 #include "token_comparison.h"
+#include "token_entries.h"
 #include "token_originals.h"
 #include "xml_input.h"
 
@@ -28,6 +29,7 @@ using SsoClient::Testing::TokenEditor;
 using Token = std::shared_ptr<const SsoClient::SamlToken>;
 
 constexpr long kTolerance = 1'000'000;
+constexpr long kMicrosecondsPerSecond = 1'000'000;
 
 Token Read(const std::string& xml, const Fuzz::Signer& signer) {
   try {
@@ -47,7 +49,7 @@ void RequireRight(const std::string& xml, const SsoClient::SamlToken& token,
   const auto model = Fuzz::ReadByModel(xml, *document);
   Fuzz::Require(model.has_value());
   Fuzz::Require(Fuzz::IsCurrent(*model, Tarnik::System::GetUtcDateTime().GetUtcTime(),
-                                kTolerance * 1'000'000));
+                                kTolerance * kMicrosecondsPerSecond));
   Fuzz::RequireValues(token, *model);
 }
 
@@ -81,7 +83,8 @@ struct Original {
   std::string text;
   const Fuzz::Signer* signer;
   DevSts::SignOptions options;
-  bool isUnchanged;  ///< one of the layouts as it is
+  bool isUnchanged = false;  ///< one of the layouts as it is
+  bool isFlawed = false;
 };
 
 void ChooseOptions(Choices& choices, DevSts::SignOptions& options) {
@@ -95,10 +98,12 @@ void ChooseOptions(Choices& choices, DevSts::SignOptions& options) {
 
 // Changed texts are signed in one way, the fastest, since there are many of them.
 Original MakeOriginal(Choices& choices) {
-  Original original{choices.OneOf(Fuzz::Layouts()), Fuzz::Signers().data(), {}, false};
+  Original original{choices.OneOf(Fuzz::Layouts()), Fuzz::Signers().data(), {}};
   const std::size_t change = choices.Below(8);
   if (change < 3) {
-    original.text = Fuzz::WithFlaw(original.text, choices.OneOf(Fuzz::Flaws()));
+    const std::string text = Fuzz::WithFlaw(original.text, choices.OneOf(Fuzz::Flaws()));
+    original.isFlawed = text != original.text;
+    original.text = text;
   } else if (change == 3) {
     choices.Edit(original.text, 2);
   } else {
@@ -126,6 +131,12 @@ struct Signed {
   std::string values;
 };
 
+// The layouts are made once, and expire while a fuzzer runs for hours.
+bool IsValidForAMinute(const SsoClient::SamlToken& token) {
+  const long now = Tarnik::System::GetUtcDateTime().GetUtcTime();
+  return now + 60 * kMicrosecondsPerSecond < token.ExpirationTime().GetUtcTime();
+}
+
 std::optional<Signed> SignAndCheck(const Original& original) {
   const auto xml = Sign(original);
   if (!xml) {
@@ -133,11 +144,16 @@ std::optional<Signed> SignAndCheck(const Original& original) {
   }
   const Token token = Read(*xml, *original.signer);
   Fuzz::Require(token != nullptr || !original.isUnchanged);
+  Fuzz::Require(token == nullptr || !original.isFlawed);
   if (token == nullptr) {
     return Signed{*xml, nullptr, ""};
   }
   RequireRight(*xml, *token, *original.signer);
-  return Signed{*xml, token, SsoClient::Testing::AllValues(*token)};
+  const std::string values = SsoClient::Testing::AllValues(*token);
+  if (original.isUnchanged && IsValidForAMinute(*token)) {
+    Fuzz::RequireSameFromEveryEntry(*xml, *original.signer, values);
+  }
+  return Signed{*xml, token, values};
 }
 
 // Signing takes longer than everything else, so the last results are kept.

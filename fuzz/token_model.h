@@ -58,8 +58,8 @@ struct ModelToken {
 };
 
 /// The token in an element, or nothing if the element is not a token: it has another layout, or
-/// breaks a rule that does not depend on the time. Whether a ds:Signature has the structure that
-/// XML Signature prescribes is for `isSignature` to say.
+/// breaks a rule that does not depend on the time. `isSignature` decides whether an element is a
+/// ds:Signature.
 std::optional<ModelToken> ReadToken(const xmlNode* assertion,
                                     const std::function<bool(const xmlNode*)>& isSignature);
 

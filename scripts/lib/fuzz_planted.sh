@@ -78,10 +78,13 @@ plant_and_seek() {
   local names name status=0
   mapfile -t names < <(fuzzers_of "$1")
   apply_patch "$1" || { echo "$1 does not apply" >&2; return 1; }
-  build_planted "${names[@]/#/ssoclient_}" || status=1
-  for name in "${names[@]}"; do
-    [ "$status" -ne 0 ] || seek_fault "$1" "$name" "$2" || status=1
-  done
+  if build_planted "${names[@]/#/ssoclient_}"; then
+    for name in "${names[@]}"; do
+      seek_fault "$1" "$name" "$2" || status=1
+    done
+  else
+    status=1
+  fi
   apply_patch "$1" -R
   return "$status"
 }
