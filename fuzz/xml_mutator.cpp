@@ -4,6 +4,7 @@
 #include <array>
 #include <random>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "input.h"
@@ -61,6 +62,8 @@ constexpr std::array kPieces{"<!---->",
                              "&#13;",
                              "<x xmlns=\"urn:x\">y</x>"};
 
+constexpr std::string_view kSeparators = "@\\#:/-+=. 0";
+
 /// A part of the text.
 struct Range {
   std::size_t begin = 0;
@@ -74,7 +77,7 @@ class Mutation {
   Mutation(std::string xml, unsigned seed) : xml_(std::move(xml)), random_(seed) {}
 
   std::string Result() {
-    switch (Below(8)) {
+    switch (Below(11)) {
       case 0:
         InsertAttribute();
         break;
@@ -88,13 +91,19 @@ class Mutation {
         Replace(OneOf(Values()), OneOf(kValues));
         break;
       case 4:
-        Replace(OneOf(Texts()), OneOf(kValues));
+        Replace(OneOf(FullTexts()), OneOf(kValues));
         break;
       case 5:
         InsertPiece();
         break;
       case 6:
         Replace(OneOf(Elements()), "");
+        break;
+      case 7:
+        Change(OneOf(Values()));
+        break;
+      case 8:
+        Change(OneOf(FullTexts()));
         break;
       default:
         CopyElement();
@@ -128,6 +137,32 @@ class Mutation {
     Replace({place, place}, element);
   }
 
+  // Changes one character of a value, or inserts one that separates something.
+  void Change(const Range& range) {
+    if (range.begin == range.end) {
+      return;
+    }
+    const std::size_t place = range.begin + Below(range.end - range.begin);
+    switch (Below(4)) {
+      case 0:
+        xml_.erase(place, 1);
+        break;
+      case 1:
+        xml_.insert(place, 1, OneOf(kSeparators));
+        break;
+      case 2:
+        xml_[place] = xml_[range.begin + Below(range.end - range.begin)];
+        break;
+      default:
+        xml_[place] = static_cast<char>(xml_[place] ^ 1 << Below(6));
+    }
+  }
+
+  std::vector<Range> FullTexts() const {
+    std::vector<Range> texts = Texts();
+    std::erase_if(texts, [](const Range& text) { return text.begin == text.end; });
+    return texts;
+  }
   // What is between two tags, most often nothing.
   std::vector<Range> Texts() const {
     std::vector<Range> texts;
