@@ -9,6 +9,7 @@
 
 #include "input.h"
 #include "signature_model.h"
+#include "value_model.h"
 #include "xml_tree.h"
 
 namespace Fuzz {
@@ -40,6 +41,14 @@ template <class Values, class Models>
 bool AreSame(const Values& values, const Models& models) {
   return std::equal(values.begin(), values.end(), models.begin(), models.end(),
                     [](const auto& value, const auto& model) { return IsSame(value, model); });
+}
+
+// Public comparisons of principals ignore letter case (ASCII), those of the delegation do not.
+void RequireComparable(const SsoClient::PrincipalId& id) {
+  const SsoClient::PrincipalId lower{LowerCaseOf(id.name), LowerCaseOf(id.domain)};
+  Require(id == id && id == lower && lower == id);
+  Require(!(id == SsoClient::PrincipalId{id.name + "x", id.domain}));
+  Require(!(id == SsoClient::PrincipalId{id.name, id.domain + "x"}));
 }
 
 void RequireLists(const SsoClient::SamlToken& token, const ModelToken& model) {
@@ -107,6 +116,7 @@ void RequireValues(const SsoClient::SamlToken& token, const ModelToken& model) {
   Require(token.StartTime().GetUtcTime() == model.notBefore);
   Require(token.ExpirationTime().GetUtcTime() == model.notOnOrAfter);
   Require(IsSame(token.Subject(), model.subject));
+  RequireComparable(token.Subject());
   Require(token.IsRenewable() == (model.renewals != 0));
   Require(token.IsDelegable() == (model.proxies != 0));
   Require(token.IsSolution() == model.isSolution);

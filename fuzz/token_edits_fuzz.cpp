@@ -90,7 +90,7 @@ struct Original {
 void ChooseOptions(Choices& choices, DevSts::SignOptions& options) {
   options.digest = static_cast<DevSts::DigestAlgorithm>(choices.Below(3));
   options.canonicalization = static_cast<DevSts::CanonicalMode>(choices.Below(4));
-  options.keyInfo = static_cast<DevSts::KeyInfoContent>(choices.Below(2) * 2);
+  options.keyInfo = static_cast<DevSts::KeyInfoContent>(choices.Below(3));
   if (choices.Below(3) == 0) {
     options.inclusivePrefixes = {"xs", "rsa", "#default"};
   }

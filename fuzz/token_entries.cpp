@@ -7,6 +7,7 @@
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/saml_token_factory.h>
+#include <tarnik/core/exception.h>
 
 #include "input.h"
 #include "support/token_values.h"
@@ -80,6 +81,22 @@ void RequireRefused(const Entry& entry, const std::string& xml, const Signer& ot
   Require(isRefused);
 }
 
+// Nothing verifies a token without a resolver, but a caller asked for that.
+void RequireResolver(const std::string& xml) {
+  int refusals = 0;
+  try {
+    CreateSamlToken(xml, [](const SamlToken*) { return nullptr; });
+  } catch (const InvalidSignatureException&) {
+    ++refusals;
+  }
+  try {
+    CreateSamlToken(xml, KeyInfoResolverSource());
+  } catch (const Tarnik::InvalidArgumentException&) {
+    ++refusals;
+  }
+  Require(refusals == 2);
+}
+
 }  // namespace
 
 void RequireSameFromEveryEntry(const std::string& xml, const Signer& signer,
@@ -87,6 +104,7 @@ void RequireSameFromEveryEntry(const std::string& xml, const Signer& signer,
   for (const Entry& entry : EntriesThatOnlyRead()) {
     RequireAccepted(entry, xml, signer, values);
   }
+  RequireResolver(xml);
   for (const Entry& entry : EntriesThatVerify()) {
     RequireAccepted(entry, xml, signer, values);
     for (const Signer& other : Signers()) {

@@ -126,7 +126,8 @@ const std::vector<Flaw>& Flaws() {
        ">false</saml2:AttributeValue><saml2:AttributeValue>true</saml2:AttributeValue>"},
       {"<saml2:SubjectConfirmationData NotOnOrAfter=\"20",
        "<saml2:SubjectConfirmationData NotOnOrAfter=\"19"},
-      {"cm:bearer", "cm:sender-vouches"}};
+      {"cm:bearer", "cm:sender-vouches"},
+      {"alice@example.com", "al<!-- -->ice@example.com"}};
   return flaws;
 }
 

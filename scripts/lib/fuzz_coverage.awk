@@ -1,6 +1,14 @@
 # Reads lcov's format and prints the line coverage of each folder of src and tarnik/src. Fails if a folder of `minima`,
 # such as "src/token=95 src/xml=95", is below its percentage, and then lists its files.
 
+# Compilers keep paths as they are given, such as /tree/build/coverage/../../src/token/principal_id.cpp.
+function normalized(path) {
+  while (match(path, /\/[^\/.][^\/]*\/\.\.\//)) {
+    path = substr(path, 1, RSTART) substr(path, RSTART + RLENGTH)
+  }
+  return path
+}
+
 function percentage(reached, lines) { return lines ? 100 * reached / lines : 0 }
 
 BEGIN {
@@ -12,7 +20,7 @@ BEGIN {
 }
 
 /^SF:/ {
-  file = substr($0, 4)
+  file = normalized(substr($0, 4))
   isOurs = index(file, root) == 1
   file = isOurs ? substr(file, length(root) + 1) : ""
   isOurs = file ~ /^(src|tarnik\/src)\/[^\/]+\//

@@ -20,7 +20,7 @@ measure_coverage() {
   [ $# -eq 0 ] || { echo "usage: scripts/fuzz --coverage" >&2; return 2; }
   mapfile -t names < <(list_fuzzers)
   configure_fuzzers . "$coverage" -DCMAKE_BUILD_TYPE=Debug \
-    "-DCMAKE_CXX_FLAGS=-g0 -fprofile-instr-generate -fcoverage-mapping"
+    "-DCMAKE_CXX_FLAGS=-fprofile-instr-generate -fcoverage-mapping"
   build_fuzzers "$coverage" ssoclient_fuzzers
   rm -rf "$coverage/profiles"
   mkdir -p "$coverage/profiles"
