@@ -127,7 +127,7 @@ const std::vector<Flaw>& Flaws() {
       {"<saml2:SubjectConfirmationData NotOnOrAfter=\"20",
        "<saml2:SubjectConfirmationData NotOnOrAfter=\"19"},
       {"cm:bearer", "cm:sender-vouches"},
-      {"alice@example.com", "al<!-- -->ice@example.com"}};
+      {"alice@example.com", "alice@example<!-- -->.com"}};
   return flaws;
 }
 
