@@ -14,9 +14,6 @@ const std::string kSecurity =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
 const std::string kSaml = "urn:oasis:names:tc:SAML:2.0:assertion";
 
-/// Whether white space around the name of a fault code is ignored, as xs:QName allows.
-constexpr bool kMayBlanksSurroundCodes = false;
-
 const xmlNode* ElementAt(const xmlNode* element, std::initializer_list<const char*> path) {
   for (const char* name : path) {
     element = ChildElement(element, name);
@@ -39,15 +36,8 @@ struct Code {
   std::string name;
 };
 
-std::string Trimmed(const std::string& text) {
-  const std::size_t begin = text.find_first_not_of(" \t\r\n");
-  return begin == std::string::npos
-             ? ""
-             : text.substr(begin, text.find_last_not_of(" \t\r\n") - begin + 1);
-}
-
 Code CodeOf(const xmlNode* element, const std::string& written) {
-  const std::string text = kMayBlanksSurroundCodes ? Trimmed(written) : written;
+  const std::string text = Trimmed(written);
   const std::size_t colon = text.find(':');
   if (colon == std::string::npos) {
     return {kSoap, text};

@@ -7,9 +7,6 @@
 namespace Fuzz {
 namespace {
 
-/// Whether an xsi:type that nothing depends on needs a declared prefix.
-constexpr bool kMustTypesBeNameable = true;
-
 bool Contains(const std::vector<std::string>& names, const std::string& name) {
   return std::find(names.begin(), names.end(), name) != names.end();
 }
@@ -57,20 +54,15 @@ std::optional<std::string> TypeOf(const xmlNode* element) {
   return std::nullopt;
 }
 
-bool IsNameOfType(const xmlNode* element, const std::string& value, const std::string& space,
+bool IsNameOfType(const xmlNode* element, const std::string& written, const std::string& space,
                   const std::string& name) {
+  const std::string value = Trimmed(written);
   const std::size_t colon = value.find(':');
   if (colon == std::string::npos) {
     return value == name && NamespaceBoundTo(element, "") == space;
   }
   return Demanded(NamespaceBoundTo(element, value.substr(0, colon))) == space &&
          value.substr(colon + 1) == name;
-}
-
-void DemandNameableType(const xmlNode* element) {
-  if (const auto type = TypeOf(element); type && kMustTypesBeNameable) {
-    IsNameOfType(element, *type, "", "");
-  }
 }
 
 ModelPrincipal PrincipalOf(const xmlNode* nameId) {

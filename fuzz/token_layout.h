@@ -74,10 +74,8 @@ long DateAttributeOf(const xmlNode* element, const std::string& name);
 std::optional<std::string> TypeOf(const xmlNode* element);
 /// True if the name in an xsi:type is that of the type of this namespace; its prefix has to be
 /// declared.
-bool IsNameOfType(const xmlNode* element, const std::string& value, const std::string& space,
+bool IsNameOfType(const xmlNode* element, const std::string& written, const std::string& space,
                   const std::string& name);
-/// For elements that are read in the same way whatever their type is.
-void DemandNameableType(const xmlNode* element);
 
 /// The parts of an assertion. Each element has the expected name already.
 ModelPrincipal PrincipalOf(const xmlNode* nameId);

@@ -8,21 +8,16 @@ const std::string kClaims = "http://schemas.xmlsoap.org/ws/2005/05/identity/clai
 const std::string kGroups = "http://sts-vendor.example/schemas/attr-names/2009/01/GroupIdentity";
 const std::string kSolution = "http://sso.example/schemas/attr-names/2011/07/isSolution";
 
-/// Whether an AttributeValue may be empty: in an advice it may, in the attribute statement not.
-constexpr bool kMayAdviceBeEmpty = true;
-constexpr bool kMayClaimBeEmpty = false;
-
-std::string ValueOf(const xmlNode* element, bool mayBeEmpty) {
+std::string ValueOf(const xmlNode* element) {
   DemandAttributes(element, {}, {kTypeAttribute});
-  DemandNameableType(element);
-  return mayBeEmpty && ChildrenOf(element).empty() ? std::string() : OnlyTextOf(element);
+  return ChildrenOf(element).empty() ? std::string() : OnlyTextOf(element);
 }
 
-ModelAttribute AttributeIn(const xmlNode* element, bool mayBeEmpty) {
+ModelAttribute AttributeIn(const xmlNode* element) {
   DemandAttributes(element, {"Name"}, {"NameFormat", "FriendlyName"});
   ModelAttribute attribute{*AttributeOf(element, "Name"), {}};
   for (Contents contents(element); !contents.IsAtEnd();) {
-    attribute.values.push_back(ValueOf(contents.Take("AttributeValue"), mayBeEmpty));
+    attribute.values.push_back(ValueOf(contents.Take("AttributeValue")));
   }
   return attribute;
 }
@@ -58,7 +53,7 @@ void ReadAdvice(const xmlNode* advice, ModelToken& token) {
     DemandAttributes(block, {"AdviceSource"});
     ModelAdvice read{*AttributeOf(block, "AdviceSource"), {}};
     for (Contents inner(block); !inner.IsAtEnd();) {
-      read.attributes.push_back(AttributeIn(inner.Take("Attribute"), kMayAdviceBeEmpty));
+      read.attributes.push_back(AttributeIn(inner.Take("Attribute")));
     }
     token.advice.push_back(read);
   }
@@ -81,7 +76,7 @@ void ReadAuthnStatement(const xmlNode* statement) {
 void ReadAttributeStatement(const xmlNode* statement, ModelToken& token) {
   DemandAttributes(statement, {});
   for (Contents contents(statement); !contents.IsAtEnd();) {
-    ReadClaim(AttributeIn(contents.Take("Attribute"), kMayClaimBeEmpty), token);
+    ReadClaim(AttributeIn(contents.Take("Attribute")), token);
   }
 }
 

@@ -59,7 +59,6 @@ void ReadConfirmationData(const xmlNode* data, ModelToken& token) {
     token.certificate = CertificateIn(data);
   } else {
     DemandAttributes(data, {"NotOnOrAfter"}, {kTypeAttribute});
-    DemandNameableType(data);
     DemandNoContent(data);
   }
   token.confirmedUntil = DateAttributeOf(data, "NotOnOrAfter");

@@ -169,4 +169,11 @@ std::string LowerCaseOf(std::string text) {
   return text;
 }
 
+std::string Trimmed(const std::string& text) {
+  const std::size_t begin = text.find_first_not_of(" \t\r\n");
+  return begin == std::string::npos
+             ? ""
+             : text.substr(begin, text.find_last_not_of(" \t\r\n") - begin + 1);
+}
+
 }  // namespace Fuzz

@@ -22,6 +22,9 @@ std::optional<bool> BooleanOf(const std::string& text);
 /// `text` with each ASCII letter in lower case.
 std::string LowerCaseOf(std::string text);
 
+/// `text` without the white space of XML at both ends, where the name in a QName begins and ends.
+std::string Trimmed(const std::string& text);
+
 }  // namespace Fuzz
 
 #endif
