@@ -316,8 +316,8 @@ bool HasBrokenChunks(std::string_view text) {
     std::size_t size = 0;
     const auto [end, error] = std::from_chars(rest.data(), rest.data() + rest.size(), size, 16);
     const std::size_t line = rest.find("\r\n");
-    if (error != std::errc() || line == std::string_view::npos ||
-        (*end != ';' && *end != '\r') || HasBareLineEnd(rest.substr(0, line + 2))) {
+    if (error != std::errc() || line == std::string_view::npos || (*end != ';' && *end != '\r') ||
+        HasBareLineEnd(rest.substr(0, line + 2))) {
       return true;
     }
     if (size == 0) {
@@ -366,9 +366,10 @@ const Rule kStricter[] = {
     {"uses a transfer coding in HTTP/1.0",
      [](std::string_view text) { return Contains(text, "HTTP/1.0 "); }},
     {"switches to another protocol",
-     [](std::string_view text) { return Contains(text, "HTTP/1.1 101 ") || Contains(text, "HTTP/1.0 101 "); }},
-    {"more than 16 interim answers",
-     [](std::string_view text) { return Contains(text, " 1"); }},
+     [](std::string_view text) {
+       return Contains(text, "HTTP/1.1 101 ") || Contains(text, "HTTP/1.0 101 ");
+     }},
+    {"more than 16 interim answers", [](std::string_view text) { return Contains(text, " 1"); }},
     {"spends more bytes on chunk headers",
      [](std::string_view text) { return text.size() > Tarnik::Http::kMaxHeaderBytes; }},
     // It looks for "close" and "keep-alive" in any text.

@@ -68,23 +68,36 @@ const Holder& TheHolder() {
 
 // Texts that are hard to write, in front of the input's own.
 std::string Text(FuzzedDataProvider& input) {
-  static const char* const kHard[] = {
-      "",         "&<>\"'",  "\r\n\t ",        "]]>",        "<!--",
-      " a  b ",   "&#13;",   "\xE2\x80\xA8",   "\xC2\x85",   "\xF0\x9F\x98\x80",
-      "\xEF\xBF\xBE", "\xED\xA0\x80", "\xC1\x81", "holderOfKeyCertificate"};
+  static const char* const kHard[] = {"",
+                                      "&<>\"'",
+                                      "\r\n\t ",
+                                      "]]>",
+                                      "<!--",
+                                      " a  b ",
+                                      "&#13;",
+                                      "\xE2\x80\xA8",
+                                      "\xC2\x85",
+                                      "\xF0\x9F\x98\x80",
+                                      "\xEF\xBF\xBE",
+                                      "\xED\xA0\x80",
+                                      "\xC1\x81",
+                                      "holderOfKeyCertificate"};
   const auto index = input.ConsumeIntegralInRange<std::size_t>(0, 3 * std::size(kHard));
   const std::string own = input.ConsumeRandomLengthString(12);
   return index < std::size(kHard) ? kHard[index] + own : own;
 }
 
 std::string TokenText(FuzzedDataProvider& input, const std::string& id) {
-  static const char* const kBegins[] = {
-      "<Assertion", "<s:Assertion xmlns:s=\"urn:s\"", "<Assertion xmlns=\"urn:a\" xml:lang=\"en\"",
-      "<?xml version=\"1.0\"?><!-- c --><s:Assertion xmlns:s='urn:s' s:Id=\"holderOfKeyCertificate\"",
-      "<Assertion id=\"holderOfKeyProofSignature\""};
+  static const char* const kBegins[] = {"<Assertion", "<s:Assertion xmlns:s=\"urn:s\"",
+                                        "<Assertion xmlns=\"urn:a\" xml:lang=\"en\"",
+                                        "<?xml version=\"1.0\"?><!-- c --><s:Assertion "
+                                        "xmlns:s='urn:s' s:Id=\"holderOfKeyCertificate\"",
+                                        "<Assertion id=\"holderOfKeyProofSignature\""};
   const std::string begin = input.PickValueInArray(kBegins);
-  const std::string name = begin.find("s:Assertion") == std::string::npos ? "Assertion" : "s:Assertion";
-  return begin + " ID=\"" + id + "\"><wst:x xmlns:wst=\"urn:w\" wst:y='&#9;'/>&#13;<![CDATA[<&>]]>" +
+  const std::string name =
+      begin.find("s:Assertion") == std::string::npos ? "Assertion" : "s:Assertion";
+  return begin + " ID=\"" + id +
+         "\"><wst:x xmlns:wst=\"urn:w\" wst:y='&#9;'/>&#13;<![CDATA[<&>]]>" +
          input.ConsumeRandomLengthString(16) + "</" + name + ">";
 }
 
@@ -328,8 +341,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   Fuzz::Require(!isRefused);
   const auto read = Fuzz::ReadWithLibXml2(*body);
   Fuzz::Require(read.has_value());
-  Fuzz::Require(Fuzz::WithoutValues(*read) ==
-                Fuzz::WithoutValues(Fuzz::ExpectedRequest(request)));
+  Fuzz::Require(Fuzz::WithoutValues(*read) == Fuzz::WithoutValues(Fuzz::ExpectedRequest(request)));
   if (request.IsSigned()) {
     CheckSignature(*body);
   }

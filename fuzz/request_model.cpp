@@ -89,9 +89,9 @@ Element Leg(const RequestCase& request) {
 Element Participants(const std::set<std::string>& audiences) {
   Element participants{kWst, "Participants"};
   for (const std::string& audience : audiences) {
-    participants.children.push_back(Parent(
-        kWst, "Participant",
-        {Parent(kWsa, "EndpointReference", {Text(kWsa, "Address", audience)})}));
+    participants.children.push_back(
+        Parent(kWst, "Participant",
+               {Parent(kWsa, "EndpointReference", {Text(kWsa, "Address", audience)})}));
   }
   return participants;
 }
@@ -123,13 +123,14 @@ Element TokenOf(const std::string& text) {
 Element IssueBody(const RequestCase& request) {
   const auto& spec = request.spec;
   const auto boolean = [](bool value) { return value ? "true" : "false"; };
-  Element body = Parent(
-      kWst, "RequestSecurityToken",
-      {Text(kWst, "TokenType", kSaml), Text(kWst, "RequestType", kWst + "/Issue"),
-       Text(kWst, "KeyType", kWst + (request.IsForKey() ? "/PublicKey" : "/Bearer")),
-       Lifetime(request, kWst, "Lifetime", spec.tokenLifetimeSec),
-       {kWst, "Renewing", {{"Allow", boolean(spec.renewable)}, {"OK", "false"}}},
-       Text(kWst, "Delegatable", boolean(spec.delegable))});
+  Element body =
+      Parent(kWst, "RequestSecurityToken",
+             {Text(kWst, "TokenType", kSaml),
+              Text(kWst, "RequestType", kWst + "/Issue"),
+              Text(kWst, "KeyType", kWst + (request.IsForKey() ? "/PublicKey" : "/Bearer")),
+              Lifetime(request, kWst, "Lifetime", spec.tokenLifetimeSec),
+              {kWst, "Renewing", {{"Allow", boolean(spec.renewable)}, {"OK", "false"}}},
+              Text(kWst, "Delegatable", boolean(spec.delegable))});
   const auto add = [&body](Element child) { body.children.push_back(std::move(child)); };
   if (spec.delegateTo) {
     add(Parent(kWst, "DelegateTo",
@@ -167,11 +168,10 @@ Element RequestBody(const RequestCase& request) {
                      Text(kWst, "RequestType", kWst + "/Validate"),
                      Parent(kWst, "ValidateTarget", {TokenOf(request.token)})});
     case Operation::kRenew:
-      return Parent(
-          kWst, "RequestSecurityToken",
-          {Text(kWst, "TokenType", kSaml), Text(kWst, "RequestType", kWst + "/Renew"),
-           Lifetime(request, kWst, "Lifetime", request.spec.tokenLifetimeSec),
-           Parent(kWst, "RenewTarget", {TokenOf(request.token)})});
+      return Parent(kWst, "RequestSecurityToken",
+                    {Text(kWst, "TokenType", kSaml), Text(kWst, "RequestType", kWst + "/Renew"),
+                     Lifetime(request, kWst, "Lifetime", request.spec.tokenLifetimeSec),
+                     Parent(kWst, "RenewTarget", {TokenOf(request.token)})});
     default:
       return IssueBody(request);
   }
@@ -198,22 +198,21 @@ Element KeyReference(const RequestCase& request) {
         {{kWsse, "Reference", {{"URI", "#holderOfKeyCertificate"}, {"ValueType", kX509}}}});
   }
   const std::string profile = "http://docs.oasis-open.org/wss/oasis-wss-saml-token";
-  Element reference =
-      Parent(kWsse, "SecurityTokenReference",
-             {{kWsse,
-               "KeyIdentifier",
-               {{"ValueType", profile + "-profile-1.1#SAMLID"}},
-               request.tokenId}});
+  Element reference = Parent(kWsse, "SecurityTokenReference",
+                             {{kWsse,
+                               "KeyIdentifier",
+                               {{"ValueType", profile + "-profile-1.1#SAMLID"}},
+                               request.tokenId}});
   reference.attributes["{" + kWsse11 + "}TokenType"] = profile + "profile-1.1#SAMLV2.0";
   return reference;
 }
 
 Element Signature(const RequestCase& request) {
-  const Element signedInfo = Parent(
-      kDs, "SignedInfo",
-      {Algorithm("CanonicalizationMethod", kExclusive),
-       Algorithm("SignatureMethod", "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256"),
-       Reference("Body"), Reference("Timestamp")});
+  const Element signedInfo =
+      Parent(kDs, "SignedInfo",
+             {Algorithm("CanonicalizationMethod", kExclusive),
+              Algorithm("SignatureMethod", "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256"),
+              Reference("Body"), Reference("Timestamp")});
   return {kDs,
           "Signature",
           {{"Id", "holderOfKeyProofSignature"}},

@@ -51,14 +51,13 @@ constexpr std::array kForms{"http://www.w3.org/2001/10/xml-exc-c14n#",
                             "http://www.w3.org/2000/09/xmldsig#base64",
                             "http://www.w3.org/2000/09/xmldsig#enveloped-signature"};
 constexpr std::size_t kSupportedDigests = 3;
-constexpr std::array kDigests{"http://www.w3.org/2001/04/xmlenc#sha256",
-                              "http://www.w3.org/2001/04/xmldsig-more#sha384",
-                              "http://www.w3.org/2001/04/xmlenc#sha512",
-                              "http://www.w3.org/2000/09/xmldsig#sha1",
-                              "http://www.w3.org/2001/04/xmldsig-more#md5"};
+constexpr std::array kDigests{
+    "http://www.w3.org/2001/04/xmlenc#sha256", "http://www.w3.org/2001/04/xmldsig-more#sha384",
+    "http://www.w3.org/2001/04/xmlenc#sha512", "http://www.w3.org/2000/09/xmldsig#sha1",
+    "http://www.w3.org/2001/04/xmldsig-more#md5"};
 // The last supported one is the element that contains the signature.
 constexpr std::size_t kSupportedTargets = 6;
-constexpr std::array kTargets{"",    "#_root", "#_a", "#_w",           "#_d",
+constexpr std::array kTargets{"",    "#_root", "#_a", "#_w",          "#_d",
                               "#_c", "#_none", "#",   "#xpointer(/)", "#xpointer(id('_a'))"};
 
 bool Encloses(const std::string& target) {
@@ -125,7 +124,8 @@ class Maker {
            "<w xmlns:u=\"http://docs.oasis-open.org/wss/2004/01/"
            "oasis-200401-wss-wssecurity-utility-1.0.xsd\" u:Id=\"_w\"><v xmlns=\"urn:v\"/></w>"
            "<c id=\"_c\"><r:before/>" +
-           signature + "<after/></c><d xml:id=\"_d\"><?pi data?><e xmlns:e=\"urn:e\" e:f=\"\"/></d>" +
+           signature +
+           "<after/></c><d xml:id=\"_d\"><?pi data?><e xmlns:e=\"urn:e\" e:f=\"\"/></d>" +
            "</r:root>";
   }
 
@@ -154,7 +154,8 @@ class Maker {
   std::string Reference() {
     const std::string target = Pick(kTargets, kSupportedTargets);
     std::string transforms;
-    const bool isEnveloped = input_.ConsumeIntegralInRange(0, 7) == 0 ? !Encloses(target) : Encloses(target);
+    const bool isEnveloped =
+        input_.ConsumeIntegralInRange(0, 7) == 0 ? !Encloses(target) : Encloses(target);
     isSupported_ = isSupported_ && isEnveloped == Encloses(target);
     if (isEnveloped) {
       transforms = std::string("<ds:Transform Algorithm=\"") + kEnveloped + "\"/>";

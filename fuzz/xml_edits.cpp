@@ -7,25 +7,27 @@
 namespace Fuzz {
 namespace {
 
-const char* const kContents[] = {"<!--x-->",    "<?x y?>", "<![CDATA[]]>",   "<![CDATA[a]]>",
-                                 "&#13;",       "\r\n",    " ",              "&amp;",
-                                 "A",           "<x/>",    "<x Id=\"_a\"/>", "<x xmlns=\"\"/>",
+const char* const kContents[] = {"<!--x-->",
+                                 "<?x y?>",
+                                 "<![CDATA[]]>",
+                                 "<![CDATA[a]]>",
+                                 "&#13;",
+                                 "\r\n",
+                                 " ",
+                                 "&amp;",
+                                 "A",
+                                 "<x/>",
+                                 "<x Id=\"_a\"/>",
+                                 "<x xmlns=\"\"/>",
                                  "<x ID=\"_b\" Id=\"_a\"/>"};
 
-const char* const kAttributes[] = {" Id=\"_a\"",
-                                   " ID=\"_b\"",
-                                   " id=\"_c\"",
-                                   " iD=\"_a\"",
-                                   " xml:id=\"_d\"",
-                                   " xml:lang=\"de\"",
-                                   " xmlns=\"urn:q\"",
-                                   " xmlns=\"\"",
-                                   " xmlns:q=\"urn:q\"",
-                                   " xmlns:a=\"urn:q\"",
-                                   " q=\"1\"",
-                                   " URI=\"\"",
-                                   " Type=\"urn:t\"",
-                                   " "};
+const char* const kAttributes[] = {" Id=\"_a\"",         " ID=\"_b\"",
+                                   " id=\"_c\"",         " iD=\"_a\"",
+                                   " xml:id=\"_d\"",     " xml:lang=\"de\"",
+                                   " xmlns=\"urn:q\"",   " xmlns=\"\"",
+                                   " xmlns:q=\"urn:q\"", " xmlns:a=\"urn:q\"",
+                                   " q=\"1\"",           " URI=\"\"",
+                                   " Type=\"urn:t\"",    " "};
 
 std::size_t Below(FuzzedDataProvider& input, std::size_t bound) {
   return input.ConsumeIntegralInRange<std::size_t>(0, bound - 1);

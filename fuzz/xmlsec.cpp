@@ -240,7 +240,9 @@ std::string DecodedBase64(std::string text) {
   std::string bytes(text.size(), '\0');
   const int size = EVP_DecodeBlock(reinterpret_cast<unsigned char*>(bytes.data()), AsXml(text),
                                    static_cast<int>(text.size()));
-  bytes.resize(size < 0 ? 0 : static_cast<std::size_t>(size) - std::min<std::size_t>(padding, static_cast<std::size_t>(size)));
+  bytes.resize(size < 0 ? 0
+                        : static_cast<std::size_t>(size) -
+                              std::min<std::size_t>(padding, static_cast<std::size_t>(size)));
   return bytes;
 }
 
@@ -330,7 +332,8 @@ std::string SignWithXmlSec(const std::string& xml, EVP_PKEY* key) {
   const Document document = Parse(xml);
   xmlNode* signature = document == nullptr ? nullptr : Find(document->children, "Signature");
   xmlNode* methodElement = Find(signature, "SignatureMethod");
-  const Method* method = FindMethod(methodElement == nullptr ? "" : AttributeOf(methodElement, "Algorithm"));
+  const Method* method =
+      FindMethod(methodElement == nullptr ? "" : AttributeOf(methodElement, "Algorithm"));
   if (method == nullptr) {
     return "";
   }

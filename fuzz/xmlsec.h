@@ -25,9 +25,9 @@ struct ReadSignature {
   std::vector<ReadReference> references;
 };
 
-/// Verifies the first ds:Signature of `xml` with `key`, or the one with this Id; KeyInfo is ignored. Ids are the attributes
-/// ID, Id and id without a prefix, xml:id and wsu:Id. OpenSSL verifies the signature value of
-/// RSA-PSS, which xmlsec1 does not know.
+/// Verifies the first ds:Signature of `xml` with `key`, or the one with this Id; KeyInfo is
+/// ignored. Ids are the attributes ID, Id and id without a prefix, xml:id and wsu:Id. OpenSSL
+/// verifies the signature value of RSA-PSS, which xmlsec1 does not know.
 ReadSignature VerifyWithXmlSec(const std::string& xml, EVP_PKEY* key,
                                const std::string& signatureId = "");
 
