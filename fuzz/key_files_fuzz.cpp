@@ -159,7 +159,9 @@ std::optional<std::vector<Block>> BlocksOf(std::string_view text) {
 
 std::string TextOf(const X509_NAME* name) {
   const OpenSsl::OwnedBio memory(BIO_new(BIO_s_mem()));
-  X509_NAME_print_ex(memory.get(), name, 0, XN_FLAG_RFC2253);
+  // Characters outside ASCII are not escaped.
+  X509_NAME_print_ex(memory.get(), name, 0,
+                     XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB));
   char* text = nullptr;
   const long length = BIO_get_mem_data(memory.get(), &text);
   return {text, static_cast<std::size_t>(length)};
