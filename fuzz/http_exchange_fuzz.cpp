@@ -11,6 +11,7 @@
 #include <fuzzer/FuzzedDataProvider.h>
 
 #include <tarnik/core/exception.h>
+#include <tarnik/http/bounded_user_agent.h>
 #include <tarnik/http/cookie_store.h>
 #include <tarnik/http/http_exception.h>
 #include <tarnik/http/http_request.h>
@@ -177,6 +178,16 @@ class Exchange {
         0);
   }
 
+  /// What a caller that waits for the end receives.
+  void CheckWait(Http::UserAgent& agent) {
+    try {
+      const auto response = agent.Wait(item_.get(), 0);
+      Fuzz::Require(result_ && response->Status().code == result_->code);
+    } catch (const Exception&) {
+      Fuzz::Require(!result_);
+    }
+  }
+
   bool HasEnded() const { return count_ == 1; }
   void Cancel() { item_->Cancel(); }
   const std::string& AnswerBytes() const { return answer_; }
@@ -212,7 +223,8 @@ void RunAll() {
 }
 
 /// Sends the bytes of the answer and, if they are not enough, ends the connection.
-void Finish(Exchange& exchange, ScriptedStream& stream, FuzzedDataProvider& input) {
+void Finish(Exchange& exchange, ScriptedStream& stream, Http::CallLimit& limit,
+            FuzzedDataProvider& input) {
   stream.Push(exchange.AnswerBytes());
   RunAll();
   const bool isPending = !exchange.HasEnded();
@@ -222,6 +234,7 @@ void Finish(Exchange& exchange, ScriptedStream& stream, FuzzedDataProvider& inpu
   } else if (ending == 1) {
     stream.PushError("reset");
   } else if (ending == 2) {
+    limit.Cancel();
     exchange.Cancel();
   }
   RunAll();
@@ -244,14 +257,18 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   script.connectError = input.ConsumeIntegralInRange(0, 9) == 9 ? "refused" : "";
   const auto spec = MakeRef<ScriptedSpec>(script);
   const auto cookies = Http::CreateCookieStore("");
-  const auto agent = Http::CreateHttpUserAgent(spec.get(), cookies.get(), nullptr);
+  auto agent = Http::CreateHttpUserAgent(spec.get(), cookies.get(), nullptr);
+  const auto limit = Http::CreateCallLimit(Http::CallLimit::Clock::time_point::max());
+  if (input.ConsumeBool()) {
+    agent = Http::CreateBoundedUserAgent(agent.get(), limit.get());
+  }
   bool mayReuse = false;
   for (int exchanges = 0; exchanges < 2; ++exchanges) {
     Exchange exchange(input, AnswerText(input));
     const std::size_t before = spec->Streams().size();
     exchange.Start(*agent);
     RunAll();
-    if (!script.connectError.empty()) {
+    if (!script.connectError.empty() || exchange.HasEnded()) {
       Fuzz::Require(exchange.HasEnded() && !exchange.Result());
       continue;
     }
@@ -265,7 +282,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     // The port of the endpoint is the default port of HTTPS.
     exchange.CheckWritten(wire, script.isTls ? "sts.example" : "sts.example:443");
     Fuzz::Require(wire.empty());
-    Finish(exchange, *stream, input);
+    Finish(exchange, *stream, *limit, input);
+    exchange.CheckWait(*agent);
     const auto parsed = Parsed(exchange.AnswerBytes(), false);
     mayReuse = isNew && parsed && parsed->mayBeFollowed;
   }

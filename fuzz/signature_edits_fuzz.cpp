@@ -13,10 +13,10 @@
 #include <tarnik/xml/security/signature.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 
-#include "crypto/public_key_impl.h"
 #include "fixed_random.h"
 #include "input.h"
 #include "support/openssl.h"
+#include "support/test_certificates.h"
 #include "xml_edits.h"
 #include "xml_input.h"
 #include "xmlsec.h"
@@ -72,35 +72,85 @@ bool IsAmong(const List& list, std::size_t supported, const std::string& text) {
 struct Signer {
   OpenSsl::OwnedKey key;
   bool isEc = false;
+  Ref<const Crypto::Certificate> certificate = {};
 };
 
-// The last one is too short.
+// The last two are too short and a stranger's.
 constexpr std::size_t kStrongSigners = 4;
+constexpr std::size_t kSigners = 5;
 const std::vector<Signer>& Signers() {
   static const std::vector<Signer> signers = [] {
     Fuzz::FixRandomness(1);
     std::vector<Signer> made;
-    made.push_back({OpenSsl::OwnedKey(EVP_PKEY_Q_keygen(nullptr, nullptr, "RSA", size_t{2048}))});
+    made.push_back({Tarnik::Testing::MakeRsaKey(2048)});
     for (const char* curve : {"P-256", "P-384", "P-521"}) {
-      made.push_back({OpenSsl::OwnedKey(EVP_PKEY_Q_keygen(nullptr, nullptr, "EC", curve)), true});
+      made.push_back({Tarnik::Testing::MakeEcKey(curve), true});
     }
-    made.push_back({OpenSsl::OwnedKey(EVP_PKEY_Q_keygen(nullptr, nullptr, "RSA", size_t{1024}))});
+    made.push_back({Tarnik::Testing::MakeRsaKey(1024)});
+    made.push_back({Tarnik::Testing::MakeEcKey("P-256"), true});
+    for (Signer& signer : made) {
+      const std::string number = std::to_string(&signer - made.data());
+      Tarnik::Testing::CertificateRecipe recipe;
+      recipe.key = signer.key.get();
+      recipe.commonName = "signer" + number;
+      recipe.serial = number.c_str();
+      recipe.withKeyIdentifier = true;
+      signer.certificate = Tarnik::Testing::MakeCertificate(recipe);
+    }
     return made;
   }();
   return signers;
 }
 
-class OneKey final : public Xml::Security::KeyInfoResolver, public ObjectImpl {
- public:
-  explicit OneKey(EVP_PKEY* key) : key_(key) {}
-  Ref<const Crypto::PublicKey> Resolve(const Xml::Security::KeyInfo& /*keyInfo*/) const override {
-    EVP_PKEY_up_ref(key_);
-    return MakeRef<const Crypto::PublicKeyImpl>(OpenSsl::OwnedKey(key_));
-  }
+std::string Encoded(const unsigned char* bytes, std::size_t size) {
+  std::string text(4 * ((size + 2) / 3) + 1, '\0');
+  text.resize(static_cast<std::size_t>(EVP_EncodeBlock(
+      reinterpret_cast<unsigned char*>(text.data()), bytes, static_cast<int>(size))));
+  return text;
+}
 
- private:
-  EVP_PKEY* const key_;
-};
+/// What names the signer's key, or with `kStranger` another trusted one.
+enum class Hint { kNone, kCertificate, kIssuerSerial, kKeyIdentifier, kSubject, kStranger };
+
+std::string KeyInfoOf(const Crypto::Certificate& own, const Crypto::Certificate& stranger,
+                      Hint hint) {
+  std::string content;
+  switch (hint) {
+    case Hint::kNone:
+      return "";
+    case Hint::kCertificate:
+    case Hint::kStranger: {
+      const Crypto::Certificate& named = hint == Hint::kStranger ? stranger : own;
+      content = "<ds:X509Certificate>" + Encoded(named.DerBytes(), named.DerLength()) +
+                "</ds:X509Certificate>";
+      break;
+    }
+    case Hint::kIssuerSerial:
+      content = "<ds:X509IssuerSerial><ds:X509IssuerName>" + own.IssuerName() +
+                "</ds:X509IssuerName><ds:X509SerialNumber>" + own.SerialNumber() +
+                "</ds:X509SerialNumber></ds:X509IssuerSerial>";
+      break;
+    case Hint::kKeyIdentifier:
+      content = "<ds:X509SKI>" +
+                Encoded(own.SubjectKeyIdentifier().data(), own.SubjectKeyIdentifier().size()) +
+                "</ds:X509SKI>";
+      break;
+    case Hint::kSubject:
+      content = "<ds:X509SubjectName>" + own.SubjectName() + "</ds:X509SubjectName>";
+      break;
+  }
+  return "<ds:KeyInfo><ds:X509Data>" + content + "</ds:X509Data></ds:KeyInfo>";
+}
+
+Ref<const Xml::Security::KeyInfoResolver> ResolverFor(const Signer& signer, Hint hint) {
+  std::vector<Ref<const Crypto::Certificate>> trusted{signer.certificate};
+  if (hint != Hint::kNone) {
+    trusted.push_back(Signers().back().certificate);
+  }
+  return hint == Hint::kIssuerSerial
+             ? Xml::Security::CreateCertificateIssuerResolver(std::move(trusted))
+             : Xml::Security::CreateTrustedCertificatesResolver(std::move(trusted));
+}
 
 /// Makes documents with a template, and knows whether the signature is of a supported form.
 class Maker {
@@ -185,13 +235,14 @@ const Xml::ElementNode* FirstSignature(const Xml::Document& document) {
 }
 
 /// The URIs of the references of a valid signature; nothing for any other.
-std::optional<std::vector<std::string>> AcceptedReferences(const std::string& xml, EVP_PKEY* key) {
+std::optional<std::vector<std::string>> AcceptedReferences(const std::string& xml,
+                                                           const Signer& signer, Hint hint) {
   const auto document = Fuzz::ParseXml(xml);
   const Xml::ElementNode* element = document == nullptr ? nullptr : FirstSignature(*document);
   if (element == nullptr || Fuzz::HasOddNamespace(*document)) {
     return std::nullopt;
   }
-  const auto resolver = MakeRef<OneKey>(key);
+  const auto resolver = ResolverFor(signer, hint);
   std::vector<std::string> uris;
   try {
     const auto signature =
@@ -238,26 +289,30 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const std::vector<Signer>& signers = Signers();
   Fuzz::FixRandomness(size);
   FuzzedDataProvider input(data, size);
-  const auto index = input.ConsumeIntegralInRange<std::size_t>(0, signers.size() - 1);
+  const auto index = input.ConsumeIntegralInRange<std::size_t>(0, kSigners - 1);
   const Signer& signer = signers[index];
+  const auto hint = static_cast<Hint>(input.ConsumeIntegralInRange(0, 5));
   Maker maker(input);
   const std::string text = maker.Make(signer);
   std::string xml = Fuzz::SignWithXmlSec(text, signer.key.get());
-  const bool isSigned = !xml.empty();
-  if (!isSigned) {
-    Fuzz::Require(!maker.IsSupported() || index >= kStrongSigners);
+  const bool isAcceptable =
+      maker.IsSupported() && index < kStrongSigners && hint != Hint::kStranger;
+  if (xml.empty()) {
+    Fuzz::Require(!isAcceptable);
     xml = text;
   }
+  xml.insert(xml.find("</ds:Signature>"),
+             KeyInfoOf(*signer.certificate, *signers.back().certificate, hint));
   const bool isEdited = input.remaining_bytes() > 0;
   for (int edits = 0; edits < 6 && input.remaining_bytes() > 0; ++edits) {
     Fuzz::EditXml(xml, input);
   }
-  const auto accepted = AcceptedReferences(xml, signer.key.get());
+  const auto accepted = AcceptedReferences(xml, signer, hint);
   if (accepted) {
     Fuzz::Require(index < kStrongSigners);
     CheckAccepted(*accepted, Fuzz::VerifyWithXmlSec(xml, signer.key.get()));
   } else {
-    Fuzz::Require(isEdited || !maker.IsSupported() || index >= kStrongSigners);
+    Fuzz::Require(isEdited || !isAcceptable);
   }
   return 0;
 }
