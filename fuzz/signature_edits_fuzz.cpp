@@ -158,7 +158,7 @@ class Maker {
   explicit Maker(FuzzedDataProvider& input) : input_(input) {}
 
   std::string Make(const Signer& signer) {
-    const std::string method = Pick(kMethods, kSupportedMethods);
+    const std::string method = Method(signer.isEc);
     isSupported_ = isSupported_ && (method.find("ecdsa") != std::string::npos) == signer.isEc;
     std::string info = "<ds:CanonicalizationMethod Algorithm=\"" + Pick(kForms, kSupportedForms) +
                        "\"/><ds:SignatureMethod Algorithm=\"" + method + "\"/>";
@@ -170,7 +170,7 @@ class Maker {
                                   "\"><ds:SignedInfo>" + info +
                                   "</ds:SignedInfo><ds:SignatureValue/></ds:Signature>";
     return "<r:root xmlns:r=\"urn:r\" xmlns:unused=\"urn:u\" ID=\"_root\" xml:lang=\"en\">\n"
-           "<a Id=\"_a\" b=\"2\" a=\"1&#10;\">x<!-- a remark --> &amp; y&#13;</a>"
+           "<p/><q/><s/><a Id=\"_a\" b=\"2\" a=\"1&#10;\">x<!-- a remark --> &amp; y&#13;</a>"
            "<w xmlns:u=\"http://docs.oasis-open.org/wss/2004/01/"
            "oasis-200401-wss-wssecurity-utility-1.0.xsd\" u:Id=\"_w\"><v xmlns=\"urn:v\"/></w>"
            "<c id=\"_c\"><r:before/>" +
@@ -185,10 +185,20 @@ class Maker {
   // Mostly a supported one.
   template <class List>
   std::string Pick(const List& list, std::size_t supported) {
-    const auto choice = input_.ConsumeIntegralInRange<std::size_t>(0, 4 * list.size() - 1);
+    const auto choice = input_.ConsumeIntegralInRange<std::size_t>(0, 16 * list.size() - 1);
     const std::size_t index = choice < list.size() ? choice : choice % supported;
     isSupported_ = isSupported_ && index < supported;
     return list[index];
+  }
+
+  // Mostly one for the type of the key.
+  std::string Method(bool isEc) {
+    constexpr std::size_t kRsaMethods = 6;
+    if (input_.ConsumeIntegralInRange(0, 7) == 7) {
+      return Pick(kMethods, kSupportedMethods);
+    }
+    const auto choice = input_.ConsumeIntegralInRange<std::size_t>(0, kRsaMethods - 1);
+    return kMethods[isEc ? kRsaMethods + choice % 3 : choice];
   }
 
   std::string Form() {
@@ -292,6 +302,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const auto index = input.ConsumeIntegralInRange<std::size_t>(0, kSigners - 1);
   const Signer& signer = signers[index];
   const auto hint = static_cast<Hint>(input.ConsumeIntegralInRange(0, 5));
+  const int edits = std::max(input.ConsumeIntegralInRange(-1, 3), 0);
   Maker maker(input);
   const std::string text = maker.Make(signer);
   std::string xml = Fuzz::SignWithXmlSec(text, signer.key.get());
@@ -303,8 +314,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   }
   xml.insert(xml.find("</ds:Signature>"),
              KeyInfoOf(*signer.certificate, *signers.back().certificate, hint));
-  const bool isEdited = input.remaining_bytes() > 0;
-  for (int edits = 0; edits < 6 && input.remaining_bytes() > 0; ++edits) {
+  for (int i = 0; i < edits; ++i) {
     Fuzz::EditXml(xml, input);
   }
   const auto accepted = AcceptedReferences(xml, signer, hint);
@@ -312,7 +322,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     Fuzz::Require(index < kStrongSigners);
     CheckAccepted(*accepted, Fuzz::VerifyWithXmlSec(xml, signer.key.get()));
   } else {
-    Fuzz::Require(isEdited || !isAcceptable);
+    Fuzz::Require(edits > 0 || !isAcceptable);
   }
   return 0;
 }

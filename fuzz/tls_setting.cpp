@@ -58,7 +58,7 @@ const Pki& ThePki() {
 // Mostly the first value.
 template <class Choice>
 Choice Choose(FuzzedDataProvider& input, int last) {
-  const int choice = input.ConsumeIntegralInRange(0, 31);
+  const int choice = input.ConsumeIntegralInRange(0, 4 * last);
   return static_cast<Choice>(choice <= last ? choice : 0);
 }
 

@@ -18,6 +18,8 @@ const char* const kContents[] = {"<!--x-->",
                                  "A",
                                  "<x/>",
                                  "<x Id=\"_a\"/>",
+                                 "<x xml:id=\"_d\"/>",
+                                 "<x id=\"_c\"/>",
                                  "<x xmlns=\"\"/>",
                                  "<x ID=\"_b\" Id=\"_a\"/>"};
 
