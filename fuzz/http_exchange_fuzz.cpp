@@ -3,6 +3,7 @@
 // that the parser finds in the same bytes, or with a documented exception if there is none. Only a
 // connection that may be used again is.
 #include <algorithm>
+#include <limits>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -12,10 +13,12 @@
 
 #include <tarnik/core/exception.h>
 #include <tarnik/http/bounded_user_agent.h>
+#include <tarnik/http/connection_specs.h>
 #include <tarnik/http/cookie_store.h>
 #include <tarnik/http/http_exception.h>
 #include <tarnik/http/http_request.h>
 #include <tarnik/http/http_user_agent.h>
+#include <tarnik/ssl/ssl_context.h>
 
 #include "fixed_clock.h"
 #include "http/response_parser.h"
@@ -163,7 +166,7 @@ class Exchange {
     request_->BodyWriter()->Write(body_);
   }
 
-  void Start(Http::UserAgent& agent) {
+  void Start(Http::UserAgent& agent, unsigned long timeout) {
     item_ = agent.SendAsync(
         request_.get(),
         [this](Exception* error, Http::ClientResponse* response, Http::PendingRequestItem*) {
@@ -175,7 +178,7 @@ class Exchange {
                         dynamic_cast<IOException*>(error) != nullptr ||
                         dynamic_cast<CancelledException*>(error) != nullptr);
         },
-        0);
+        timeout);
   }
 
   /// What a caller that waits for the end receives.
@@ -245,16 +248,51 @@ void Finish(Exchange& exchange, ScriptedStream& stream, Http::CallLimit& limit,
                             parsed->body == exchange.Result()->body));
 }
 
+/// The spec cannot begin to connect.
+void RequireRefused(Exchange& exchange, Http::UserAgent& agent) {
+  bool isRefused = false;
+  try {
+    exchange.Start(agent, 0);
+  } catch (const InvalidArgumentException&) {
+    isRefused = true;
+  }
+  RunAll();
+  Fuzz::Require(isRefused && !exchange.HasEnded());
+}
+
+/// Nobody listens on the first port of this machine.
+void RequireUnreachable(FuzzedDataProvider& input) {
+  const auto context = Ssl::CreateSSLContext({});
+  const auto spec = input.ConsumeBool() ? Http::CreateTLSConnectionSpec(
+                                              "127.0.0.1", 1, context.get(), "sts.example")
+                                        : Http::CreateTCPConnectionSpec("127.0.0.1", 1);
+  const auto agent = Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+  Exchange exchange(input, "");
+  exchange.Start(*agent, 0);
+  while (!exchange.HasEnded()) {
+    RunAll();
+  }
+  Fuzz::Require(!exchange.Result());
+}
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   Fuzz::RunOnOneThread();
   Fuzz::FixClock(System::DateTime::Parse("2024-03-05T07:08:09Z"));
   FuzzedDataProvider input(data, size);
+  if (input.ConsumeIntegralInRange(0, 15) == 15) {
+    RequireUnreachable(input);
+    return 0;
+  }
   ScriptedSpec::Script script;
   script.isTls = input.ConsumeBool();
   script.stream.pieceSize = input.ConsumeIntegralInRange<std::size_t>(1, 64);
   script.connectError = input.ConsumeIntegralInRange(0, 9) == 9 ? "refused" : "";
+  script.startError = input.ConsumeIntegralInRange(0, 9) == 9 ? "not now" : "";
+  script.stream.failWriteAt = input.ConsumeIntegralInRange(0, 9) == 9
+                                  ? input.ConsumeIntegralInRange<std::size_t>(0, 200)
+                                  : std::numeric_limits<std::size_t>::max();
   const auto spec = MakeRef<ScriptedSpec>(script);
   const auto cookies = Http::CreateCookieStore("");
   auto agent = Http::CreateHttpUserAgent(spec.get(), cookies.get(), nullptr);
@@ -266,10 +304,18 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   for (int exchanges = 0; exchanges < 2; ++exchanges) {
     Exchange exchange(input, AnswerText(input));
     const std::size_t before = spec->Streams().size();
-    exchange.Start(*agent);
+    if (!script.startError.empty()) {
+      RequireRefused(exchange, *agent);
+      continue;
+    }
+    // Nothing takes that long.
+    constexpr unsigned long kHour = 3'600'000'000;
+    exchange.Start(*agent, input.ConsumeBool() ? kHour : 0);
     RunAll();
+    // Before any answer it can only fail.
     if (!script.connectError.empty() || exchange.HasEnded()) {
       Fuzz::Require(exchange.HasEnded() && !exchange.Result());
+      mayReuse = false;
       continue;
     }
     const bool isNew = spec->Streams().size() > before;

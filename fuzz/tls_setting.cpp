@@ -1,6 +1,7 @@
 #include "tls_setting.h"
 
 #include <tarnik/crypto/private_key.h>
+#include <tarnik/ssl/ssl_exception.h>
 
 #include "fixed_random.h"
 #include "input.h"
@@ -66,7 +67,7 @@ Choice Choose(FuzzedDataProvider& input, int last) {
 
 TlsSetting::TlsSetting(FuzzedDataProvider& input)
     : isTls13_(input.ConsumeBool()),
-      trust_(Choose<Trust>(input, 2)),
+      trust_(Choose<Trust>(input, 6)),
       chain_(Choose<Chain>(input, 3)),
       lists_(Choose<Lists>(input, 4)),
       pin_(Choose<Pin>(input, 2)),
@@ -102,8 +103,8 @@ Tarnik::OpenSsl::OwnedSslContext TlsSetting::ServerContext() const {
 
 Tarnik::Ref<Tarnik::Ssl::SSLContext> TlsSetting::ClientContext() const {
   Tarnik::Ssl::SSLContextConfig config;
-  AddTrust(config);
   AddLists(config);
+  AddTrust(config);
   const Pki& pki = ThePki();
   if (pin_ != Pin::kNone) {
     const Identity& server = chain_ == Chain::kDirect ? pki.direct : pki.indirect;
@@ -115,7 +116,11 @@ Tarnik::Ref<Tarnik::Ssl::SSLContext> TlsSetting::ClientContext() const {
         Tarnik::Testing::ToPkcs8Pem(pki.indirect.key.get()));
     config.clientCertificateChain = {pki.intermediate.ToCertificate()};
   }
-  return Tarnik::Ssl::CreateSSLContext(config);
+  try {
+    return Tarnik::Ssl::CreateSSLContext(config);
+  } catch (const Tarnik::Ssl::SSLException&) {
+    return nullptr;
+  }
 }
 
 void TlsSetting::AddTrust(Tarnik::Ssl::SSLContextConfig& config) const {
@@ -129,6 +134,18 @@ void TlsSetting::AddTrust(Tarnik::Ssl::SSLContextConfig& config) const {
       break;
     case Trust::kFolder:
       config.caFolders = {pki.folder.Path()};
+      break;
+    case Trust::kSystem:
+      config.useSystemStore = true;
+      break;
+    case Trust::kEmptyFile:
+      config.caFiles = {pki.clean.Path()};
+      break;
+    case Trust::kNoFile:
+      config.caFiles = {pki.folder.Path() + "/none"};
+      break;
+    case Trust::kBrokenList:
+      config.crlFiles = {pki.rootFile.Path()};
       break;
   }
 }
@@ -167,7 +184,8 @@ std::string TlsSetting::Host() const {
 }
 
 bool TlsSetting::IsServerAcceptable() const {
-  return (chain_ == Chain::kDirect || chain_ == Chain::kWithIntermediate) &&
+  return trust_ != Trust::kSystem &&
+         (chain_ == Chain::kDirect || chain_ == Chain::kWithIntermediate) &&
          (lists_ == Lists::kNone || lists_ == Lists::kClean) && pin_ != Pin::kOther &&
          (name_ == Name::kHost || name_ == Name::kAddress);
 }

@@ -19,7 +19,10 @@ class TlsSetting {
   explicit TlsSetting(FuzzedDataProvider& input);
 
   Tarnik::OpenSsl::OwnedSslContext ServerContext() const;
+  /// Null if its files are refused.
   Tarnik::Ref<Tarnik::Ssl::SSLContext> ClientContext() const;
+  /// Whether its files must be refused.
+  bool HasBrokenFile() const { return trust_ >= Trust::kEmptyFile; }
 
   bool IsTls13() const { return isTls13_; }
   /// The name that the client expects.
@@ -30,7 +33,7 @@ class TlsSetting {
   bool IsAcceptable() const;
 
  private:
-  enum class Trust { kMemory, kFile, kFolder };
+  enum class Trust { kMemory, kFile, kFolder, kSystem, kEmptyFile, kNoFile, kBrokenList };
   enum class Chain { kDirect, kWithIntermediate, kWithoutIntermediate, kStranger };
   enum class Lists { kNone, kClean, kRevoking, kOfOthers, kOutdated };
   enum class Pin { kNone, kServer, kOther };

@@ -48,6 +48,7 @@ class Connection {
         stream_(context.WrapStream(server_.get(), "")) {}
 
   void Run(const Fuzz::TlsSetting& setting) {
+    RequireNotReady();
     Outcome handshake;
     stream_->HandshakeClientAsync(setting.Host(), "",
                                   [&](Exception* error) { handshake.Report(error); });
@@ -65,6 +66,17 @@ class Connection {
   }
 
  private:
+  // Before the handshake, and while another write is under way.
+  void RequireNotReady() {
+    bool isRefused = false;
+    try {
+      stream_->WriteAsync("x", 1, [](Exception*) { Fuzz::Require(false); });
+    } catch (const InvalidStateException&) {
+      isRefused = true;
+    }
+    Fuzz::Require(isRefused);
+  }
+
   void Exchange(const Fuzz::TlsSetting& setting) {
     // More than the stream holds at once, sometimes.
     const std::size_t longest = input_.ConsumeIntegralInRange(0, 3) == 3 ? 200'000 : 4'000;
@@ -75,6 +87,7 @@ class Connection {
     Outcome written;
     stream_->WriteAsync(request.data(), request.size(),
                         [&](Exception* error) { written.Report(error); });
+    RequireNotReady();
     const bool isComplete = ReadAll();
     Finish(written);
     const std::string& received = server_->Received();
@@ -142,6 +155,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   Fuzz::FixRandomness(size);
   const OpenSsl::OwnedSslContext serverContext = setting.ServerContext();
   const auto context = setting.ClientContext();
+  Fuzz::Require((context == nullptr) == setting.HasBrokenFile());
+  if (context == nullptr) {
+    return 0;
+  }
   for (int connections = input.ConsumeIntegralInRange(1, 2); connections > 0; --connections) {
     Connection(*context, serverContext.get(), input).Run(setting);
   }
