@@ -3,6 +3,7 @@
 // that the parser finds in the same bytes, or with a documented exception if there is none. Only a
 // connection that may be used again is.
 #include <algorithm>
+#include <chrono>
 #include <limits>
 #include <optional>
 #include <string>
@@ -176,6 +177,7 @@ class Exchange {
           }
           Fuzz::Require(error == nullptr || dynamic_cast<Http::HttpException*>(error) != nullptr ||
                         dynamic_cast<IOException*>(error) != nullptr ||
+                        dynamic_cast<TimeoutException*>(error) != nullptr ||
                         dynamic_cast<CancelledException*>(error) != nullptr);
         },
         timeout);
@@ -260,6 +262,30 @@ void RequireRefused(Exchange& exchange, Http::UserAgent& agent) {
   Fuzz::Require(isRefused && !exchange.HasEnded());
 }
 
+/// The peer is silent in one of the stages, and the time of the exchange or of its limit passes.
+void RequireTimeout(FuzzedDataProvider& input) {
+  ScriptedSpec::Script script;
+  const int stage = input.ConsumeIntegralInRange(0, 2);
+  script.holdConnects = stage == 0;
+  script.stream.holdWrites = stage == 1;
+  const auto spec = MakeRef<ScriptedSpec>(script);
+  auto agent = Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
+  const auto limit = Http::CreateCallLimit(Http::CallLimit::Clock::now() +
+                                           std::chrono::milliseconds(input.ConsumeBool() ? 1 : 0));
+  const bool isLimited = input.ConsumeBool();
+  if (isLimited) {
+    agent = Http::CreateBoundedUserAgent(agent.get(), limit.get());
+  }
+  Exchange exchange(input, "");
+  constexpr unsigned long kMillisecond = 1000;
+  exchange.Start(*agent, isLimited ? 0 : kMillisecond);
+  while (!exchange.HasEnded()) {
+    RunAll();
+  }
+  exchange.CheckWait(*agent);
+  Fuzz::Require(!exchange.Result());
+}
+
 /// Nobody listens on the first port of this machine.
 void RequireUnreachable(FuzzedDataProvider& input) {
   const auto context = Ssl::CreateSSLContext({});
@@ -281,8 +307,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   Fuzz::RunOnOneThread();
   Fuzz::FixClock(System::DateTime::Parse("2024-03-05T07:08:09Z"));
   FuzzedDataProvider input(data, size);
-  if (input.ConsumeIntegralInRange(0, 15) == 15) {
-    RequireUnreachable(input);
+  const int kind = input.ConsumeIntegralInRange(0, 15);
+  if (kind >= 14) {
+    kind == 15 ? RequireUnreachable(input) : RequireTimeout(input);
     return 0;
   }
   ScriptedSpec::Script script;

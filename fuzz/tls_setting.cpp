@@ -25,7 +25,7 @@ Identity LongLived(const std::string& name, bool isCa, const Identity* issuer) {
   IdentityOptions options;
   options.commonName = name;
   options.isCa = isCa;
-  options.addresses = {"192.0.2.7"};
+  options.addresses = {"192.0.2.7", "2001:db8::7"};
   options.notAfter = kLong;
   return MakeIdentity(options, issuer);
 }
@@ -69,9 +69,9 @@ TlsSetting::TlsSetting(FuzzedDataProvider& input)
     : isTls13_(input.ConsumeBool()),
       trust_(Choose<Trust>(input, 6)),
       chain_(Choose<Chain>(input, 3)),
-      lists_(Choose<Lists>(input, 4)),
+      lists_(Choose<Lists>(input, 5)),
       pin_(Choose<Pin>(input, 2)),
-      name_(Choose<Name>(input, 3)),
+      name_(Choose<Name>(input, 4)),
       asksForCertificate_(input.ConsumeIntegralInRange(0, 3) == 3),
       hasCertificate_(input.ConsumeBool()) {
   ThePki();
@@ -167,6 +167,9 @@ void TlsSetting::AddLists(Tarnik::Ssl::SSLContextConfig& config) const {
     case Lists::kOutdated:
       config.crlFiles = {pki.outdated.Path()};
       break;
+    case Lists::kBoth:
+      config.crlFiles = {pki.clean.Path(), pki.revoking.Path()};
+      break;
   }
 }
 
@@ -174,6 +177,8 @@ std::string TlsSetting::Host() const {
   switch (name_) {
     case Name::kAddress:
       return "192.0.2.7";
+    case Name::kLongAddress:
+      return "2001:db8::7";
     case Name::kOtherHost:
       return "other.example";
     case Name::kOtherAddress:
@@ -187,7 +192,7 @@ bool TlsSetting::IsServerAcceptable() const {
   return trust_ != Trust::kSystem &&
          (chain_ == Chain::kDirect || chain_ == Chain::kWithIntermediate) &&
          (lists_ == Lists::kNone || lists_ == Lists::kClean) && pin_ != Pin::kOther &&
-         (name_ == Name::kHost || name_ == Name::kAddress);
+         name_ <= Name::kLongAddress;
 }
 
 bool TlsSetting::IsAcceptable() const {

@@ -35,9 +35,9 @@ class TlsSetting {
  private:
   enum class Trust { kMemory, kFile, kFolder, kSystem, kEmptyFile, kNoFile, kBrokenList };
   enum class Chain { kDirect, kWithIntermediate, kWithoutIntermediate, kStranger };
-  enum class Lists { kNone, kClean, kRevoking, kOfOthers, kOutdated };
+  enum class Lists { kNone, kClean, kRevoking, kOfOthers, kOutdated, kBoth };
   enum class Pin { kNone, kServer, kOther };
-  enum class Name { kHost, kAddress, kOtherHost, kOtherAddress };
+  enum class Name { kHost, kAddress, kLongAddress, kOtherHost, kOtherAddress };
 
   void AddTrust(Tarnik::Ssl::SSLContextConfig& config) const;
   void AddLists(Tarnik::Ssl::SSLContextConfig& config) const;
