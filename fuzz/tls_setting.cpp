@@ -67,7 +67,7 @@ Choice Choose(FuzzedDataProvider& input, int last) {
 
 TlsSetting::TlsSetting(FuzzedDataProvider& input)
     : isTls13_(input.ConsumeBool()),
-      trust_(Choose<Trust>(input, 6)),
+      trust_(Choose<Trust>(input, 7)),
       chain_(Choose<Chain>(input, 3)),
       lists_(Choose<Lists>(input, 5)),
       pin_(Choose<Pin>(input, 2)),
@@ -110,8 +110,9 @@ Tarnik::Ref<Tarnik::Ssl::SSLContext> TlsSetting::ClientContext() const {
     const Identity& server = chain_ == Chain::kDirect ? pki.direct : pki.indirect;
     config.pinnedCertificates = {(pin_ == Pin::kServer ? server : pki.stranger).ToCertificate()};
   }
-  if (hasCertificate_) {
-    config.clientCertificate = pki.indirect.ToCertificate();
+  if (hasCertificate_ || trust_ == Trust::kOtherKey) {
+    config.clientCertificate =
+        (trust_ == Trust::kOtherKey ? pki.direct : pki.indirect).ToCertificate();
     config.clientPrivateKey = Tarnik::Crypto::CreatePrivateKeyFromPem(
         Tarnik::Testing::ToPkcs8Pem(pki.indirect.key.get()));
     config.clientCertificateChain = {pki.intermediate.ToCertificate()};
@@ -146,6 +147,8 @@ void TlsSetting::AddTrust(Tarnik::Ssl::SSLContextConfig& config) const {
       break;
     case Trust::kBrokenList:
       config.crlFiles = {pki.rootFile.Path()};
+      break;
+    case Trust::kOtherKey:
       break;
   }
 }

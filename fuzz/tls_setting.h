@@ -19,9 +19,9 @@ class TlsSetting {
   explicit TlsSetting(FuzzedDataProvider& input);
 
   Tarnik::OpenSsl::OwnedSslContext ServerContext() const;
-  /// Null if its files are refused.
+  /// Null if its files or keys are refused.
   Tarnik::Ref<Tarnik::Ssl::SSLContext> ClientContext() const;
-  /// Whether its files must be refused.
+  /// Whether they must be refused.
   bool HasBrokenFile() const { return trust_ >= Trust::kEmptyFile; }
 
   bool IsTls13() const { return isTls13_; }
@@ -33,7 +33,16 @@ class TlsSetting {
   bool IsAcceptable() const;
 
  private:
-  enum class Trust { kMemory, kFile, kFolder, kSystem, kEmptyFile, kNoFile, kBrokenList };
+  enum class Trust {
+    kMemory,
+    kFile,
+    kFolder,
+    kSystem,
+    kEmptyFile,
+    kNoFile,
+    kBrokenList,
+    kOtherKey
+  };
   enum class Chain { kDirect, kWithIntermediate, kWithoutIntermediate, kStranger };
   enum class Lists { kNone, kClean, kRevoking, kOfOthers, kOutdated, kBoth };
   enum class Pin { kNone, kServer, kOther };
