@@ -1,10 +1,9 @@
 #!/bin/sh
-# Recreates the files in key_info/ with new keys. Needs the Debian packages openssl, xmlsec1, gnutls-bin,
-# openjdk-17-jdk-headless and python3-cryptography, and node with npm, which downloads the package xml-crypto.
+# Recreates the samples in this folder with new keys. Needs the Debian packages openssl, xmlsec1, libxml2-utils,
+# gnutls-bin, openjdk-17-jdk-headless and python3-cryptography, and node with npm, which downloads the package xml-crypto.
 set -eu
 
-here=$(cd "$(dirname "$0")" && pwd)
-out=$here/key_info
+out=$(cd "$(dirname "$0")" && pwd)
 tools=$out/tools
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
