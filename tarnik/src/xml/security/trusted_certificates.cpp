@@ -47,6 +47,31 @@ std::string_view WithoutLeadingZeros(std::string_view number) noexcept {
   return number;
 }
 
+/// A distinguished name in a message.
+class NameHint {
+ public:
+  explicit NameHint(std::string_view text)
+      : text_(text), name_(DistinguishedName::FromText(text)) {}
+
+  /// True if it is the name that the library prints as `text`, or that equals `name`, which may be
+  /// null. Some types of strings have the same text, but are not equal.
+  bool Names(std::string_view text, const DistinguishedName* name) const noexcept {
+    return text_ == text || (name != nullptr && name_.Equals(*name));
+  }
+
+ private:
+  std::string_view text_;
+  DistinguishedName name_;
+};
+
+const DistinguishedName* IssuerOf(const CertificateImpl* certificate) noexcept {
+  return certificate == nullptr ? nullptr : &certificate->Issuer();
+}
+
+const DistinguishedName* SubjectOf(const CertificateImpl* certificate) noexcept {
+  return certificate == nullptr ? nullptr : &certificate->Subject();
+}
+
 /// A digest by a supported algorithm.
 struct SupportedDigest {
   Crypto::Hash hash;
@@ -194,20 +219,19 @@ TrustedCertificates::Selection TrustedCertificates::SelectByCertificates(
 TrustedCertificates::Selection TrustedCertificates::SelectByIssuerSerials(
     const std::vector<KeyInfo::IssuerSerial>& hints) const {
   struct Parsed {
-    DistinguishedName issuer;
+    NameHint issuer;
     std::string_view serialNumber;
   };
   std::vector<Parsed> parsed;
   for (const KeyInfo::IssuerSerial& hint : FirstOf(hints)) {
-    parsed.push_back(
-        {DistinguishedName::FromText(hint.issuerName), WithoutLeadingZeros(hint.serialNumber)});
+    parsed.push_back({NameHint(hint.issuerName), WithoutLeadingZeros(hint.serialNumber)});
   }
   return Select([&parsed](const Trusted& trusted) {
-    const std::string_view serialNumber = WithoutLeadingZeros(trusted.certificate->SerialNumber());
-    return trusted.decoded != nullptr && AnyOf(parsed, [&](const Parsed& hint) {
-             return hint.serialNumber == serialNumber &&
-                    hint.issuer.Equals(trusted.decoded->Issuer());
-           });
+    const Certificate& certificate = *trusted.certificate;
+    return AnyOf(parsed, [&](const Parsed& hint) {
+      return hint.serialNumber == WithoutLeadingZeros(certificate.SerialNumber()) &&
+             hint.issuer.Names(certificate.IssuerName(), IssuerOf(trusted.decoded));
+    });
   });
 }
 
@@ -222,14 +246,14 @@ TrustedCertificates::Selection TrustedCertificates::SelectByIssuerOf(
 
 TrustedCertificates::Selection TrustedCertificates::SelectBySubjectNames(
     const std::vector<std::string>& hints) const {
-  std::vector<DistinguishedName> names;
+  std::vector<NameHint> names;
   for (const std::string& hint : FirstOf(hints)) {
-    names.push_back(DistinguishedName::FromText(hint));
+    names.emplace_back(hint);
   }
   return Select([&names](const Trusted& trusted) {
-    return trusted.decoded != nullptr && AnyOf(names, [&trusted](const DistinguishedName& name) {
-             return name.Equals(trusted.decoded->Subject());
-           });
+    return AnyOf(names, [&trusted](const NameHint& name) {
+      return name.Names(trusted.certificate->SubjectName(), SubjectOf(trusted.decoded));
+    });
   });
 }
 

@@ -81,6 +81,26 @@ TEST_F(TrustedCertificatesTest, OfOneNameAreAllCandidates) {
   EXPECT_THAT(list_.NamedBy(keyInfo), IsEmpty());
 }
 
+// NumericString is not among the types whose values are compared as texts.
+TEST_F(TrustedCertificatesTest, AreNamedByTheTextOfTheLibrary) {
+  std::vector<unsigned char> der = MakeCertificateDer({.commonName = "4711"});
+  const std::string value =
+      "\x0C\x04"
+      "4711";
+  const auto place = std::search(der.begin(), der.end(), value.begin(), value.end());
+  ASSERT_NE(place, der.end());
+  *place = V_ASN1_NUMERICSTRING;
+  const auto numeric = Crypto::CreateCertificateFromDer(der.data(), der.size());
+  const TrustedCertificates list({first_, numeric});
+  KeyInfo keyInfo;
+  for (const char* name : {"CN=4711,O=Test\\, Inc.", "CN=#120434373131,O=Test\\, Inc."}) {
+    keyInfo.subjectNames = {name};
+    EXPECT_THAT(list.NamedBy(keyInfo), ElementsAre(numeric->GetPublicKey())) << name;
+  }
+  keyInfo.subjectNames = {"CN=4712,O=Test\\, Inc."};
+  EXPECT_THAT(list.NamedBy(keyInfo), IsEmpty());
+}
+
 TEST_F(TrustedCertificatesTest, AreNamedByIssuerAndSerialNumber) {
   KeyInfo keyInfo;
   keyInfo.issuerSerials = {{"2.5.4.3=#0c067369676e6572,O=Test\\, Inc.", "03"}};
