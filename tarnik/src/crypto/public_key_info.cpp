@@ -86,6 +86,16 @@ std::vector<unsigned char> EcPublicKeyInfo(std::string_view curve, std::string_v
   return KeyInfo(IdentifierOf(kEcPublicKey) + DerOf(DerTag::kObjectIdentifier, identifier), point);
 }
 
+bool IsUsualPublicKeyInfo(const PublicKeyImpl& key, std::size_t length) noexcept {
+  if (key.Algorithm() != KeyAlgorithm::kEc) {
+    return key.Algorithm() == KeyAlgorithm::kRsa;
+  }
+  // A point is a byte and two numbers; the rest is that long for P-256, and shorter for others.
+  constexpr std::size_t kMaxRest = 27;
+  const std::size_t numbers = 2 * key.OrderLength();
+  return key.NamedCurve() != Curve::kNone && length > numbers && length <= numbers + kMaxRest;
+}
+
 std::vector<unsigned char> UsualPublicKeyInfo(const PublicKeyImpl& key) {
   const OpenSsl::ErrorScope errors;
   switch (key.Algorithm()) {

@@ -1,6 +1,7 @@
 #ifndef TARNIK_CRYPTO_PUBLIC_KEY_INFO_H
 #define TARNIK_CRYPTO_PUBLIC_KEY_INFO_H
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -19,6 +20,9 @@ std::vector<unsigned char> RsaPublicKeyInfo(std::string_view modulus, std::strin
 /// is in uncompressed form. Empty for any other form and for what is not an object identifier.
 std::vector<unsigned char> EcPublicKeyInfo(std::string_view curve, std::string_view point);
 
+/// True if `length` shows that a certificate contains `key` in the form of the functions above: it
+/// is an RSA key, or an EC key with neither a compressed point nor the parameters of its curve.
+bool IsUsualPublicKeyInfo(const PublicKeyImpl& key, std::size_t length) noexcept;
 /// The form that the functions above make of `key`, whatever form its certificate contains: with
 /// the algorithm rsaEncryption for RSA-PSS keys too, and with uncompressed points. Empty for keys
 /// of other kinds and curves.

@@ -14,10 +14,16 @@ namespace Tarnik::Testing {
 namespace {
 
 using Crypto::EcPublicKeyInfo;
+using Crypto::IsUsualPublicKeyInfo;
 using Crypto::PublicKeyImpl;
 using Crypto::RsaPublicKeyInfo;
 using Crypto::UsualPublicKeyInfo;
 using testing::IsEmpty;
+
+bool IsUsual(const Crypto::Certificate& certificate) {
+  return IsUsualPublicKeyInfo(dynamic_cast<const PublicKeyImpl&>(*certificate.GetPublicKey()),
+                              certificate.SubjectPublicKeyInfo().size());
+}
 
 const PublicKeyImpl& KeyIn(const Crypto::Certificate& certificate) {
   return dynamic_cast<const PublicKeyImpl&>(*certificate.GetPublicKey());
@@ -55,6 +61,7 @@ TEST(PublicKeyInfoTest, OfAnRsaKeyIsThatOfItsCertificate) {
   EXPECT_NE(RsaPublicKeyInfo(modulus + '\0', exponent), expected);
   EXPECT_NE(RsaPublicKeyInfo(modulus, exponent + exponent), expected);
   EXPECT_EQ(UsualPublicKeyInfo(KeyIn(*certificate)), expected);
+  EXPECT_TRUE(IsUsual(*certificate));
 }
 
 TEST(PublicKeyInfoTest, NeedsNumbersThatAreNot0) {
@@ -77,6 +84,7 @@ TEST_P(EcPublicKeyInfoTest, IsThatOfTheCertificate) {
   const auto certificate = MakeCertificate({.key = key.get()});
   EXPECT_EQ(EcPublicKeyInfo(GetParam().identifier, point), certificate->SubjectPublicKeyInfo());
   EXPECT_EQ(UsualPublicKeyInfo(KeyIn(*certificate)), certificate->SubjectPublicKeyInfo());
+  EXPECT_TRUE(IsUsual(*certificate));
 }
 
 TEST_P(EcPublicKeyInfoTest, HasAnUncompressedPoint) {
@@ -87,6 +95,17 @@ TEST_P(EcPublicKeyInfoTest, HasAnUncompressedPoint) {
   const auto certificate = MakeCertificate({.key = key.get()});
   EXPECT_NE(certificate->SubjectPublicKeyInfo(), expected);
   EXPECT_EQ(UsualPublicKeyInfo(KeyIn(*certificate)), expected);
+  EXPECT_FALSE(IsUsual(*certificate));
+}
+
+TEST_P(EcPublicKeyInfoTest, IsUsualWithoutTheParametersOfTheCurve) {
+  const auto key = MakeEcKey(GetParam().name);
+  const auto expected = EcPublicKeyInfo(GetParam().identifier, PointOf(key.get(), "uncompressed"));
+  Require(EVP_PKEY_set_utf8_string_param(key.get(), OSSL_PKEY_PARAM_EC_ENCODING, "explicit") == 1,
+          "encoding");
+  const auto certificate = MakeCertificate({.key = key.get()});
+  EXPECT_NE(certificate->SubjectPublicKeyInfo(), expected);
+  EXPECT_FALSE(IsUsual(*certificate));
 }
 
 INSTANTIATE_TEST_SUITE_P(Curves, EcPublicKeyInfoTest,
@@ -115,6 +134,7 @@ TEST(PublicKeyInfoTest, OfAnRsaPssKeyHasTheUsualAlgorithm) {
                                       NumberOf(made, OSSL_PKEY_PARAM_RSA_E));
   EXPECT_EQ(UsualPublicKeyInfo(KeyIn(*certificate)), usual);
   EXPECT_NE(certificate->SubjectPublicKeyInfo(), usual);
+  EXPECT_FALSE(IsUsual(*certificate));
 }
 
 TEST(PublicKeyInfoTest, IsEmptyForOtherKeys) {

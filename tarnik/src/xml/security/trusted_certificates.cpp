@@ -5,6 +5,7 @@
 #include <limits>
 #include <map>
 #include <mutex>
+#include <optional>
 #include <span>
 #include <string_view>
 #include <utility>
@@ -38,7 +39,7 @@ std::span<const Hint> FirstOf(const std::vector<Hint>& hints) {
 }
 
 template <class List, class Matches>
-bool AnyOf(const List& list, Matches matches) {
+bool AnyOf(List& list, Matches matches) {
   return std::any_of(list.begin(), list.end(), matches);
 }
 
@@ -50,18 +51,24 @@ std::string_view WithoutLeadingZeros(std::string_view number) noexcept {
 /// A distinguished name in a message.
 class NameHint {
  public:
-  explicit NameHint(std::string_view text)
-      : text_(text), name_(DistinguishedName::FromText(text)) {}
+  explicit NameHint(std::string_view text) : text_(text) {}
 
   /// True if it is the name that the library prints as `text`, or that equals `name`, which may be
   /// null. Some types of strings have the same text, but are not equal.
-  bool Names(std::string_view text, const DistinguishedName* name) const noexcept {
-    return text_ == text || (name != nullptr && name_.Equals(*name));
+  bool Names(std::string_view text, const DistinguishedName* name) {
+    if (text_ == text && !text.empty()) {
+      return true;
+    }
+    // Read when it is needed, since that takes much longer than a comparison.
+    if (!name_) {
+      name_ = DistinguishedName::FromText(text_);
+    }
+    return name != nullptr && name_->Equals(*name);
   }
 
  private:
   std::string_view text_;
-  DistinguishedName name_;
+  std::optional<DistinguishedName> name_;
 };
 
 const DistinguishedName* IssuerOf(const CertificateImpl* certificate) noexcept {
@@ -93,16 +100,16 @@ std::vector<SupportedDigest> SupportedDigestsIn(const KeyHints& hints) {
 Bytes IdentityOf(const Crypto::PublicKey& key, const Certificate& certificate,
                  const CertificateImpl* decoded) {
   const auto* implementation = dynamic_cast<const Crypto::PublicKeyImpl*>(&key);
-  Bytes usual;
-  if (implementation != nullptr) {
-    usual = Crypto::UsualPublicKeyInfo(*implementation);
+  if (decoded == nullptr || implementation == nullptr) {
+    return Bytes(certificate.DerBytes(), certificate.DerBytes() + certificate.DerLength());
   }
-  if (!usual.empty()) {
-    return usual;
+  const Bytes& encoded = decoded->SubjectPublicKeyInfo();
+  // Computing the usual form takes much longer than recognising it.
+  if (Crypto::IsUsualPublicKeyInfo(*implementation, encoded.size())) {
+    return encoded;
   }
-  return decoded != nullptr
-             ? decoded->SubjectPublicKeyInfo()
-             : Bytes(certificate.DerBytes(), certificate.DerBytes() + certificate.DerLength());
+  const Bytes usual = Crypto::UsualPublicKeyInfo(*implementation);
+  return usual.empty() ? encoded : usual;
 }
 
 Ref<const Crypto::PublicKey> KnownKeyOf(const Certificate& certificate) {
@@ -228,7 +235,7 @@ TrustedCertificates::Selection TrustedCertificates::SelectByIssuerSerials(
   }
   return Select([&parsed](const Trusted& trusted) {
     const Certificate& certificate = *trusted.certificate;
-    return AnyOf(parsed, [&](const Parsed& hint) {
+    return AnyOf(parsed, [&](Parsed& hint) {
       return hint.serialNumber == WithoutLeadingZeros(certificate.SerialNumber()) &&
              hint.issuer.Names(certificate.IssuerName(), IssuerOf(trusted.decoded));
     });
@@ -251,7 +258,7 @@ TrustedCertificates::Selection TrustedCertificates::SelectBySubjectNames(
     names.emplace_back(hint);
   }
   return Select([&names](const Trusted& trusted) {
-    return AnyOf(names, [&trusted](const NameHint& name) {
+    return AnyOf(names, [&trusted](NameHint& name) {
       return name.Names(trusted.certificate->SubjectName(), SubjectOf(trusted.decoded));
     });
   });
