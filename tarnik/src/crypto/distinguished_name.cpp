@@ -29,11 +29,7 @@ DistinguishedName DistinguishedName::FromText(std::string_view text) {
   // OpenSSL checks what the text has in hexadecimal form, and that strings are UTF-8.
   const OpenSsl::ErrorScope errors;
   const auto* position = reinterpret_cast<const unsigned char*>(der.data());
-  const unsigned char* const end = position + der.size();
   read.name_.reset(d2i_X509_NAME(nullptr, &position, static_cast<long>(der.size())));
-  if (position != end) {
-    read.name_.reset();
-  }
   return read;
 }
 

@@ -268,6 +268,12 @@ TEST(KeyCandidatesResolverTest, MayReturnAKeyThatFails) {
   EXPECT_EQ(verdict({restricted, signer}), "valid");
   EXPECT_EQ(verdict({restricted, stranger}), verdict({restricted}));
   EXPECT_EQ(verdict({restricted}).substr(0, 9), "refused: ");
+  // Such a key cannot make a signature of another scheme, so it is not tried.
+  EXPECT_EQ(Verdict(SignedWith(Signer()),
+                    MakeRef<FixedCandidates>(
+                        std::vector<Ref<const Crypto::PublicKey>>{restricted, restricted})
+                        .get()),
+            "refused: No trusted key is of the type of the signature algorithm.");
 }
 
 }  // namespace
