@@ -31,9 +31,11 @@ class CertificateImpl final : public Certificate, public ObjectImpl {
     return subjectKeyIdentifier_;
   }
   Ref<const PublicKey> GetPublicKey() const override;
-  const std::vector<unsigned char>& SubjectPublicKeyInfo() const override { return keyInfo_; }
   std::string ToString() const override;
 
+  /// The public key with its algorithm as the certificate contains it: SubjectPublicKeyInfo (RFC
+  /// 5280, section 4.1.2.7) in DER.
+  const std::vector<unsigned char>& SubjectPublicKeyInfo() const noexcept { return keyInfo_; }
   const DistinguishedName& Subject() const noexcept { return subject_; }
   const DistinguishedName& Issuer() const noexcept { return issuer_; }
   /// The SubjectKeyIdentifier extension; when it is absent, the SHA-1 hash that usually identifies

@@ -86,7 +86,8 @@ TEST(CertificateTest, ReturnsItsPublicKeyAsItIsEncoded) {
   unsigned char* bytes = nullptr;
   const int length = i2d_PUBKEY(key.get(), &bytes);
   const OpenSsl::OwnedMemory<unsigned char> owner(bytes);
-  EXPECT_EQ(MakeCertificate({.key = key.get()})->SubjectPublicKeyInfo(),
+  const auto certificate = MakeCertificate({.key = key.get()});
+  EXPECT_EQ(dynamic_cast<const CertificateImpl&>(*certificate).SubjectPublicKeyInfo(),
             std::vector<unsigned char>(bytes, bytes + length));
 }
 

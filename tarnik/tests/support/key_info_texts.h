@@ -10,6 +10,7 @@
 #include <tarnik/xml/element_node.h>
 #include <tarnik/xml/security/key_info.h>
 
+#include "crypto/certificate_impl.h"
 #include "crypto/hash.h"
 #include "support/openssl.h"
 #include "support/test_certificates.h"
@@ -46,7 +47,9 @@ inline std::string DigestOf(const Crypto::Certificate& certificate, const std::s
 }
 
 inline std::string DerEncodedKey(const Crypto::Certificate& certificate) {
-  return "<d:DEREncodedKeyValue>" + StringUtil::Base64Encode(certificate.SubjectPublicKeyInfo()) +
+  return "<d:DEREncodedKeyValue>" +
+         StringUtil::Base64Encode(
+             dynamic_cast<const Crypto::CertificateImpl&>(certificate).SubjectPublicKeyInfo()) +
          "</d:DEREncodedKeyValue>";
 }
 

@@ -29,9 +29,6 @@ class TARNIK_EXPORT Certificate : public virtual Object {
   virtual const std::vector<unsigned char>& SubjectKeyIdentifier() const = 0;
   /// Throws `CryptoException` when the key cannot be decoded or is of an unknown kind.
   virtual Ref<const PublicKey> GetPublicKey() const = 0;
-  /// The public key with its algorithm as the certificate contains it: SubjectPublicKeyInfo (RFC
-  /// 5280, section 4.1.2.7) in DER.
-  virtual const std::vector<unsigned char>& SubjectPublicKeyInfo() const = 0;
 };
 
 /// Decodes one certificate. Certificates are cached by their bytes, so the result may be an object
