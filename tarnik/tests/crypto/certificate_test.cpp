@@ -13,6 +13,7 @@
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/crypto_exception.h>
 
+#include "crypto/certificate_impl.h"
 #include "support/openssl.h"
 #include "support/temporary_file.h"
 #include "support/test_certificates.h"
@@ -78,6 +79,29 @@ TEST(CertificateTest, ReturnsItsBytesUnchanged) {
 TEST(CertificateTest, ReturnsTheSubjectKeyIdentifier) {
   EXPECT_EQ(MakeCertificate({.withKeyIdentifier = true})->SubjectKeyIdentifier().size(), 20U);
   EXPECT_THAT(MakeCertificate()->SubjectKeyIdentifier(), IsEmpty());
+}
+
+TEST(CertificateTest, ReturnsItsPublicKeyAsItIsEncoded) {
+  const auto key = MakeEcKey("P-256");
+  unsigned char* bytes = nullptr;
+  const int length = i2d_PUBKEY(key.get(), &bytes);
+  const OpenSsl::OwnedMemory<unsigned char> owner(bytes);
+  const auto certificate = MakeCertificate({.key = key.get()});
+  EXPECT_EQ(dynamic_cast<const CertificateImpl&>(*certificate).SubjectPublicKeyInfo(),
+            std::vector<unsigned char>(bytes, bytes + length));
+}
+
+// RFC 5280, section 4.2.1.2, method 1, which OpenSSL uses for the extension too.
+TEST(CertificateTest, HasTheUsualKeyIdentifierWithoutTheExtension) {
+  const auto with = MakeCertificate({.withKeyIdentifier = true});
+  const auto without = MakeCertificate();
+  const auto identifierOf = [](const Certificate& certificate) {
+    return dynamic_cast<const CertificateImpl&>(certificate).KeyIdentifier();
+  };
+  EXPECT_EQ(identifierOf(*with), with->SubjectKeyIdentifier());
+  EXPECT_EQ(identifierOf(*without), with->SubjectKeyIdentifier());
+  EXPECT_NE(identifierOf(*MakeCertificate({.key = MakeEcKey("P-256").get()})),
+            with->SubjectKeyIdentifier());
 }
 
 TEST(CertificateTest, IsNotDecodedAgainWhenItsBytesAreKnown) {

@@ -155,6 +155,15 @@ Hash LookUpDigestMethod(std::string_view algorithm, const ElementNode* element) 
   return hash;
 }
 
+std::optional<Hash> FindDigestMethod(std::string_view algorithm) noexcept {
+  for (const SupportedDigestMethod& supported : kDigestMethods) {
+    if (supported.algorithm == algorithm) {
+      return supported.hash;
+    }
+  }
+  return std::nullopt;
+}
+
 C14nOptions LookUpCanonicalizationMethod(std::string_view algorithm, const ElementNode* element) {
   return LookUpC14n(algorithm, element, "canonicalisation");
 }

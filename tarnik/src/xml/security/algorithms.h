@@ -1,6 +1,7 @@
 #ifndef TARNIK_XML_SECURITY_ALGORITHMS_H
 #define TARNIK_XML_SECURITY_ALGORITHMS_H
 
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -27,6 +28,9 @@ SignatureMethod LookUpSignatureMethod(std::string_view algorithm, const ElementN
 
 /// SHA-256, SHA-384 and SHA-512 (XML Encryption, section 5.7; RFC 6931, section 2.1.3).
 Crypto::Hash LookUpDigestMethod(std::string_view algorithm, const ElementNode* element);
+
+/// The same, but nothing for an algorithm that is not on the list.
+std::optional<Crypto::Hash> FindDigestMethod(std::string_view algorithm) noexcept;
 
 /// Canonical XML 1.0 and Exclusive XML Canonicalization 1.0, with and without comments.
 C14nOptions LookUpCanonicalizationMethod(std::string_view algorithm, const ElementNode* element);

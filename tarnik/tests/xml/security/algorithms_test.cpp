@@ -1,5 +1,6 @@
 #include "xml/security/algorithms.h"
 
+#include <optional>
 #include <string>
 
 #include <gmock/gmock.h>
@@ -314,6 +315,18 @@ TEST(AlgorithmsTest, BoundsAndSanitisesWhatItQuotes) {
   const std::string verdict = Verdict(AssertionWithValues(signature));
   EXPECT_THAT(verdict, testing::StartsWith("refused: The signature algorithm '???xxx"));
   EXPECT_LT(verdict.size(), 250U);
+}
+
+TEST(FindDigestMethodTest, KnowsTheListedAlgorithms) {
+  EXPECT_EQ(FindDigestMethod("http://www.w3.org/2001/04/xmlenc#sha256"), Crypto::Hash::kSha256);
+  EXPECT_EQ(FindDigestMethod("http://www.w3.org/2001/04/xmldsig-more#sha384"),
+            Crypto::Hash::kSha384);
+  EXPECT_EQ(FindDigestMethod("http://www.w3.org/2001/04/xmlenc#sha512"), Crypto::Hash::kSha512);
+  for (const char* algorithm :
+       {"", "http://www.w3.org/2000/09/xmldsig#sha1", "http://www.w3.org/2001/04/xmlenc#SHA256",
+        "http://www.w3.org/2001/04/xmlenc#sha256 "}) {
+    EXPECT_EQ(FindDigestMethod(algorithm), std::nullopt) << algorithm;
+  }
 }
 
 }  // namespace

@@ -56,8 +56,10 @@ class TARNIK_EXPORT Signature : public virtual Object {
   virtual ElementNode* Element() const = 0;
 
   /// Verifies the signature value over SignedInfo with the key that `resolver` returns, and then
-  /// the digest of every reference. False when any of them does not match. Nothing is computed
-  /// before all algorithms and references have been validated, and nothing is ever fetched.
+  /// the digest of every reference. False when any of them does not match. If `resolver` is a
+  /// `KeyCandidatesResolver` that returns several keys, at most 16 of them are tried for the
+  /// signature value, and if none has made it, there is no trusted key. Nothing is computed before
+  /// all algorithms and references have been validated, and nothing is ever fetched.
   ///
   /// The supported algorithms are a closed list, compared as whole URIs:
   ///  - signatures: RSA PKCS#1 v1.5, RSA-PSS (RFC 6931, section 2.3.10) and ECDSA on P-256, P-384
