@@ -9,6 +9,7 @@
 #include "support/ascii.h"
 #include "support/quote.h"
 #include "xml/security/content_reader.h"
+#include "xml/tree_builder.h"
 
 namespace Tarnik::Xml::Security {
 namespace {
@@ -67,9 +68,10 @@ void CompareId(const ElementNode* element, const Attribute& attribute, IdLookup&
 }
 
 void CollectIdsOf(const ElementNode* element, std::vector<IdLookup>& lookups) {
-  for (std::size_t i = 0; i < element->AttributeCount(); ++i) {
-    const Attribute& attribute = element->AttributeAt(i);
-    if (!IsIdInAnyCase(attribute.Qualified().Local())) {
+  const Attribute* const attributes = TreeBuilder::AttributesOf(*element);
+  for (std::size_t i = 0; i < TreeBuilder::AttributeCountOf(*element); ++i) {
+    const Attribute& attribute = attributes[i];
+    if (!IsIdInAnyCase(TreeBuilder::NameOf(attribute).Local())) {
       continue;
     }
     for (IdLookup& lookup : lookups) {
