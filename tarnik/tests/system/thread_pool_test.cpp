@@ -81,6 +81,52 @@ TEST(ThreadPoolTest, RunsCompletionsOnFewThreads) {
   EXPECT_LE(threads.size(), 2U);
 }
 
+TEST(ThreadPoolTest, RunsWhatCompletionsStartOnTheSameThread) {
+  struct Chain {
+    std::set<std::thread::id> threads;
+    std::promise<void> done;
+    int left = 400;
+
+    void Continue() {
+      threads.insert(std::this_thread::get_id());
+      if (left-- == 0) {
+        done.set_value();
+      } else if (left % 2 == 0) {
+        GetThreadPool()->RunAfter(1, [this] { Continue(); });
+      } else {
+        GetThreadPool()->Post([this] { Continue(); });
+      }
+    }
+  };
+  Chain chain;
+  GetThreadPool()->Post([&] { chain.Continue(); });
+  ASSERT_TRUE(IsReadyInTime(chain.done.get_future()));
+  EXPECT_EQ(chain.threads.size(), 1U);
+}
+
+TEST(ThreadPoolTest, SpreadsTheCompletionsOfSeveralThreads) {
+  std::mutex mutex;
+  std::set<std::thread::id> threads;
+  const auto postFromAThread = [&] {
+    std::promise<void> ran;
+    std::thread([&] {
+      GetThreadPool()->Post([&] {
+        {
+          const std::lock_guard lock(mutex);
+          threads.insert(std::this_thread::get_id());
+        }
+        ran.set_value();
+      });
+      EXPECT_TRUE(IsReadyInTime(ran.get_future()));
+    }).join();
+  };
+  // Usually two; a thread of another test may have taken a turn meanwhile.
+  for (int i = 0; i < 20 && threads.size() < 2; ++i) {
+    postFromAThread();
+  }
+  EXPECT_EQ(threads.size(), 2U);
+}
+
 TEST(ThreadPoolTest, RunsCompletionsWhileEveryWorkerIsBlocked) {
   std::promise<void> gate;
   const auto opened = gate.get_future().share();
