@@ -2,11 +2,12 @@
 
 #include "support/ascii.h"
 #include "xml/security/content_reader.h"
+#include "xml/tree_builder.h"
 
 namespace Tarnik::Xml::Security {
 
 std::optional<std::string_view> PossibleId(const Attribute& attribute) noexcept {
-  if (!EqualsIgnoringCase(attribute.Qualified().Local(), "id")) {
+  if (!EqualsIgnoringCase(TreeBuilder::NameOf(attribute).Local(), "id")) {
     return std::nullopt;
   }
   return Trim(attribute.Value());

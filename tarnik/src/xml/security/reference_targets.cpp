@@ -9,6 +9,7 @@
 
 #include "support/ascii.h"
 #include "support/quote.h"
+#include "xml/tree_builder.h"
 
 namespace Tarnik::Xml::Security {
 namespace {
@@ -56,8 +57,9 @@ void Count(const ElementNode* element, const Attribute& attribute, IdLookup& loo
 }
 
 void CollectIdsOf(const ElementNode* element, std::vector<IdLookup>& lookups) {
-  for (std::size_t i = 0; i < element->AttributeCount(); ++i) {
-    const Attribute& attribute = element->AttributeAt(i);
+  const Attribute* const attributes = TreeBuilder::AttributesOf(*element);
+  for (std::size_t i = 0; i < TreeBuilder::AttributeCountOf(*element); ++i) {
+    const Attribute& attribute = attributes[i];
     const auto id = PossibleId(attribute);
     if (!id) {
       continue;
