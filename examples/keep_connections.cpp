@@ -10,7 +10,7 @@
 #include <tarnik/http/http_url.h>
 
 int main(int argc, char** argv) {
-  if (argc < 5) {
+  if (argc < 5 || std::string(argv[1]).rfind("https://", 0) != 0) {
     std::cerr << "usage: keep_connections HTTPS_URL CA_FILE STS_CERTIFICATE_FILE TOKEN_FILE...\n";
     return 2;
   }
@@ -25,9 +25,6 @@ int main(int argc, char** argv) {
     std::string host;
     int port = 0;
     Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, config.url);
-    if (!isHttps) {
-      throw std::runtime_error("the URL must begin with https");
-    }
     const auto spec = Tarnik::Http::CreateTLSConnectionSpec(host, port, sslContext.get(), "");
     config.userAgent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
     config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
