@@ -2,7 +2,6 @@
 // and with status 1 if the call failed for another reason.
 #include <chrono>
 #include <iostream>
-#include <stdexcept>
 #include <string>
 
 #include <ssoclient/ssoclient.h>
@@ -11,7 +10,7 @@
 #include <tarnik/http/http_url.h>
 
 int main(int argc, char** argv) {
-  if (argc != 5) {
+  if (argc != 5 || std::string(argv[1]).rfind("https://", 0) != 0) {
     std::cerr << "usage: limit_a_call HTTPS_URL CA_FILE STS_CERTIFICATE_FILE USER < password\n";
     return 2;
   }
@@ -30,9 +29,6 @@ int main(int argc, char** argv) {
     int port = 0;
     std::string host;
     Tarnik::Http::ParseHttpURL(argv[1], isHttps, host, port, config.url);
-    if (!isHttps) {
-      throw std::runtime_error("the URL must begin with https");
-    }
 
     // Once in the program: the connections of this agent serve all calls.
     const auto spec = Tarnik::Http::CreateTLSConnectionSpec(host, port, ssl.get(), "");
