@@ -195,8 +195,8 @@ bool IsId(const std::string& name, const std::string& value, const std::string& 
   if (!inAnyForm) {
     return value == id && (local == "Id" || local == "ID" || local == "id");
   }
-  return local.size() == 2 && (local[0] | 0x20) == 'i' && (local[1] | 0x20) == 'd' &&
-         value.find(id) != std::string::npos;
+  const bool isId = local.size() == 2 && (local[0] | 0x20) == 'i' && (local[1] | 0x20) == 'd';
+  return (isId || local == "AssertionID") && value.find(id) != std::string::npos;
 }
 
 int CountIds(const Fuzz::Element& element, const std::string& id, bool inAnyForm) {

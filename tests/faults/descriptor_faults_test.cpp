@@ -18,15 +18,16 @@ namespace {
 
 using Tarnik::Testing::HoldsInChild;
 
-/// During its lifetime this process can open no descriptor.
+/// During its lifetime this process can open only `spare` descriptors, if none is free among those
+/// that it has.
 class DescriptorShortage {
  public:
-  DescriptorShortage() {
+  explicit DescriptorShortage(int spare = 0) {
     getrlimit(RLIMIT_NOFILE, &before_);
     // The lowest descriptor that is free.
     const int lowest = dup(STDERR_FILENO);
     close(lowest);
-    const rlimit shortage{static_cast<rlim_t>(lowest), before_.rlim_max};
+    const rlimit shortage{static_cast<rlim_t>(lowest + spare), before_.rlim_max};
     setrlimit(RLIMIT_NOFILE, &shortage);
   }
   ~DescriptorShortage() { setrlimit(RLIMIT_NOFILE, &before_); }
@@ -70,6 +71,15 @@ TEST_F(DescriptorFaultsTest, WithoutDescriptorsForThePoolACallFails) {
   EXPECT_TRUE(HoldsInChild([&] {
     return MessageOf<Tarnik::ResourceException>([&] { client.Login(); }) == kNoPool &&
            client.Login() != nullptr;
+  }));
+}
+
+TEST_F(DescriptorFaultsTest, WithDescriptorsForOneIoThreadACallSucceeds) {
+  constexpr int kOfOneIoThread = 3;
+  const StsClient client = StsClient::WithTls();
+  EXPECT_TRUE(HoldsInChild([&] {
+    const DescriptorShortage shortage(kOfOneIoThread + 1);
+    return client.Login() != nullptr;
   }));
 }
 

@@ -7,7 +7,8 @@
 namespace Tarnik::Xml::Security {
 
 std::optional<std::string_view> PossibleId(const Attribute& attribute) noexcept {
-  if (!EqualsIgnoringCase(TreeBuilder::NameOf(attribute).Local(), "id")) {
+  const std::string_view name = TreeBuilder::NameOf(attribute).Local();
+  if (!EqualsIgnoringCase(name, "id") && name != "AssertionID") {
     return std::nullopt;
   }
   return Trim(attribute.Value());

@@ -12,7 +12,8 @@ namespace Tarnik::Xml::Security {
 /// white space around it; nothing for any other attribute. Receivers differ in which attributes are
 /// ids (xml:id 1.0; Web Services Security: SOAP Message Security 1.0, section 4.1; SAML 2.0 core,
 /// section 1.3.4) and in how they compare them. So every attribute counts whose local name is "id"
-/// in any letter case, whatever its prefix. The letter case of the value matters.
+/// in any letter case, whatever its prefix, and the AssertionID of SAML 1.1 (core, section 2.3.2).
+/// The letter case of the value matters.
 ///
 /// If two elements have the same value here, two receivers of one text may find different elements.
 /// `Signature::Verify` and `Sign` refuse references to such a value.
