@@ -13,7 +13,8 @@
 
 namespace Tarnik::Crypto {
 
-/// The only implementation of `Certificate`.
+/// The implementation of `Certificate` for everything that this library decodes. Callers may pass
+/// objects of their own classes.
 class CertificateImpl final : public Certificate, public ObjectImpl {
  public:
   /// `decoded` is the certificate of `der`.

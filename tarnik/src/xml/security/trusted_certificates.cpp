@@ -96,6 +96,21 @@ std::vector<SupportedDigest> SupportedDigestsIn(const KeyHints& hints) {
   return digests;
 }
 
+/// The certificate as this library implements it, decoded from its bytes if a caller implements it;
+/// null if they cannot be decoded.
+Ref<const CertificateImpl> DecodedFrom(const Certificate& certificate) {
+  if (const auto* implementation = dynamic_cast<const CertificateImpl*>(&certificate)) {
+    return Ref<const CertificateImpl>(implementation);
+  }
+  try {
+    const auto decoded =
+        Crypto::CreateCertificateFromDer(certificate.DerBytes(), certificate.DerLength());
+    return Ref<const CertificateImpl>(dynamic_cast<const CertificateImpl*>(decoded.get()));
+  } catch (const Crypto::CryptoException&) {
+    return nullptr;
+  }
+}
+
 /// What identifies a key: its usual form, in which hints contain it, or else what contains the key.
 Bytes IdentityOf(const Crypto::PublicKey& key, const Certificate& certificate,
                  const CertificateImpl* decoded) {
@@ -130,8 +145,8 @@ TrustedCertificates::TrustedCertificates(CertificateList certificates) {
     throw InvalidArgumentException("A trusted certificate of a key resolver cannot be null.");
   }
   for (Ref<const Certificate>& certificate : certificates) {
-    const auto* decoded = dynamic_cast<const CertificateImpl*>(certificate.get());
-    list_.push_back({std::move(certificate), decoded, kNoKey, {}});
+    Ref<const CertificateImpl> decoded = DecodedFrom(*certificate);
+    list_.push_back({std::move(certificate), std::move(decoded), kNoKey, {}});
   }
   if (list_.size() > 1) {
     CollectKeys();
@@ -145,7 +160,7 @@ void TrustedCertificates::CollectKeys() {
     if (key == nullptr) {
       continue;
     }
-    trusted.identity = IdentityOf(*key, *trusted.certificate, trusted.decoded);
+    trusted.identity = IdentityOf(*key, *trusted.certificate, trusted.decoded.get());
     const auto [place, isNew] = places.emplace(trusted.identity, keys_.size());
     trusted.key = place->second;
     if (isNew) {
@@ -237,7 +252,7 @@ TrustedCertificates::Selection TrustedCertificates::SelectByIssuerSerials(
     const Certificate& certificate = *trusted.certificate;
     return AnyOf(parsed, [&](Parsed& hint) {
       return hint.serialNumber == WithoutLeadingZeros(certificate.SerialNumber()) &&
-             hint.issuer.Names(certificate.IssuerName(), IssuerOf(trusted.decoded));
+             hint.issuer.Names(certificate.IssuerName(), IssuerOf(trusted.decoded.get()));
     });
   });
 }
@@ -259,16 +274,17 @@ TrustedCertificates::Selection TrustedCertificates::SelectBySubjectNames(
   }
   return Select([&names](const Trusted& trusted) {
     return AnyOf(names, [&trusted](NameHint& name) {
-      return name.Names(trusted.certificate->SubjectName(), SubjectOf(trusted.decoded));
+      return name.Names(trusted.certificate->SubjectName(), SubjectOf(trusted.decoded.get()));
     });
   });
 }
 
+// An empty identifier names nothing, although a certificate may have none.
 TrustedCertificates::Selection TrustedCertificates::SelectByKeyIdentifiers(
     const std::vector<Bytes>& hints) const {
   return Select([hints = FirstOf(hints)](const Trusted& trusted) {
     return trusted.decoded != nullptr && AnyOf(hints, [&trusted](const Bytes& identifier) {
-             return identifier == trusted.decoded->KeyIdentifier();
+             return !identifier.empty() && identifier == trusted.decoded->KeyIdentifier();
            });
   });
 }
@@ -288,11 +304,13 @@ TrustedCertificates::Selection TrustedCertificates::SelectByDigests(const KeyHin
   return selection;
 }
 
+// A hint that cannot be read is empty, and so is the identity of a key of an unknown kind.
 TrustedCertificates::Selection TrustedCertificates::SelectByPublicKeys(
     const std::vector<Bytes>& hints) const {
   return Select([hints = FirstOf(hints)](const Trusted& trusted) {
     return trusted.decoded != nullptr && AnyOf(hints, [&trusted](const Bytes& key) {
-             return key == trusted.identity || key == trusted.decoded->SubjectPublicKeyInfo();
+             return !key.empty() &&
+                    (key == trusted.identity || key == trusted.decoded->SubjectPublicKeyInfo());
            });
   });
 }

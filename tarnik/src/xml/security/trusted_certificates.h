@@ -40,9 +40,9 @@ class TrustedCertificates {
 
   struct Trusted {
     Ref<const Crypto::Certificate> certificate;
-    const Crypto::CertificateImpl* decoded;  ///< null if another class implements it
-    std::size_t key;                         ///< its place in `keys_`
-    Bytes identity;                          ///< what its key is compared by
+    Ref<const Crypto::CertificateImpl> decoded;  ///< null if its bytes cannot be decoded
+    std::size_t key;                             ///< its place in `keys_`
+    Bytes identity;                              ///< what its key is compared by; may be empty
   };
   using Selection = std::vector<const Trusted*>;
 

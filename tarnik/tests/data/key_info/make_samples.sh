@@ -1,6 +1,7 @@
 #!/bin/sh
 # Recreates the samples in this folder with new keys. Needs the Debian packages openssl, xmlsec1, libxml2-utils,
-# gnutls-bin, openjdk-17-jdk-headless and python3-cryptography, and node with npm, which downloads the package xml-crypto.
+# gnutls-bin, openjdk-17-jdk-headless and python3-cryptography, and node with npm, which downloads the package xml-crypto
+# with its dependency @xmldom/xmldom.
 set -eu
 
 out=$(cd "$(dirname "$0")" && pwd)
@@ -16,7 +17,7 @@ exclusive=http://www.w3.org/2001/10/xml-exc-c14n#
 saml=urn:oasis:names:tc:SAML:2.0:assertion
 
 javac -d "$work" "$tools/Names.java" "$tools/Sign.java"
-npm install --silent --no-save xml-crypto@6 @xmldom/xmldom > /dev/null
+npm install --silent --no-save xml-crypto@6.3.2 > /dev/null
 
 rsa='-algorithm RSA -pkeyopt rsa_keygen_bits:2048'
 ec='-algorithm EC -pkeyopt ec_paramgen_curve:P-256'
@@ -68,7 +69,7 @@ subject '/C=JP/O=例え/organizationIdentifier=NTRJP-1/businessCategory=Private 
 cat "$names"/*.pem > "$out/names.pem"
 {
   java -cp "$work" Names "$names"/*.pem
-  /usr/bin/python3 "$tools/names.py" "$names"/*.pem
+  python3 "$tools/names.py" "$names"/*.pem
   for certificate in "$names"/*.pem; do
     number=$(basename "$certificate" .pem)
     printf '%s\topenssl\t' "$number"
@@ -103,9 +104,21 @@ assertion() {
 }
 assertion '' > unsigned.xml
 
+# verify SIGNER FILE: with the key of the signer, whatever the KeyInfo says.
+verify() {
+  xmlsec1 --verify --enabled-key-data key-name --pubkey-cert-pem "$out/$1.pem" --id-attr:ID "$saml:Assertion" \
+    "$out/$2" 2> log || { echo "$2" >&2; cat log >&2; exit 1; }
+}
+
 # by_java and by_xml_crypto SIGNER NAMED HINT FILE
-by_java() { java -cp "$work" Sign unsigned.xml "$1.pk8" "$out/$1.pem" "$out/$2.pem" "$3" "$out/$4"; }
-by_xml_crypto() { node "$tools/sign.cjs" unsigned.xml "$1.key" "$out/$1.pem" "$out/$2.pem" "$3" "$out/$4"; }
+by_java() {
+  java -cp "$work" Sign unsigned.xml "$1.pk8" "$out/$1.pem" "$out/$2.pem" "$3" "$out/$4"
+  verify "$1" "$4"
+}
+by_xml_crypto() {
+  node "$tools/sign.cjs" unsigned.xml "$1.key" "$out/$1.pem" "$out/$2.pem" "$3" "$out/$4"
+  verify "$1" "$4"
+}
 
 # by_xmlsec1 SIGNER METHOD KEY_INFO FILE
 by_xmlsec1() {
@@ -115,6 +128,7 @@ by_xmlsec1() {
 <ds:DigestMethod Algorithm=\"http://www.w3.org/2001/04/xmlenc#sha256\"/><ds:DigestValue/></ds:Reference></ds:SignedInfo>\
 <ds:SignatureValue/>$3</ds:Signature>" > template.xml
   xmlsec1 --sign --privkey-pem "$1.key,$out/$1.pem" --id-attr:ID "$saml:Assertion" --output "$out/$4" template.xml
+  verify "$1" "$4"
 }
 
 for hint in key-value der-encoded-key-value x509-digest x509-ski x509-issuer-serial x509-subject-name key-name none; do

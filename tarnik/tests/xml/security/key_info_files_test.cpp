@@ -5,10 +5,10 @@
 
 #include <gtest/gtest.h>
 
-#include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/xml/security/key_info_resolver.h>
 
+#include "support/one_key_resolver.h"
 #include "support/signed_documents.h"
 #include "support/test_data.h"
 
@@ -17,19 +17,10 @@ namespace {
 
 using namespace Tarnik::Xml::Security;
 
-// Signatures of other implementations: see tests/data/README.md.
+// Signatures of other implementations: see tests/data/key_info/README.md.
 Ref<const Crypto::Certificate> Load(const std::string& name) {
   return Crypto::CreateCertificatesFromPem(ReadTestData("key_info/" + name + ".pem")).front();
 }
-
-class OneKeyResolver final : public KeyInfoResolver, public ObjectImpl {
- public:
-  explicit OneKeyResolver(Ref<const Crypto::PublicKey> key) : key_(std::move(key)) {}
-  Ref<const Crypto::PublicKey> Resolve(const KeyInfo& /*keyInfo*/) const override { return key_; }
-
- private:
-  const Ref<const Crypto::PublicKey> key_;
-};
 
 class KeyInfoFileTest : public testing::TestWithParam<const char*> {
  protected:

@@ -244,5 +244,51 @@ TEST_F(UnknownKeyTest, IsSkippedAmongOthersAndReportedWhenItIsNamed) {
   EXPECT_THROW(TrustedCertificates({unknown}).NamedBy(KeyInfo()), Crypto::CryptoException);
 }
 
+// The identity of the unknown key is empty, and so is a hint that cannot be read.
+TEST_F(UnknownKeyTest, IsNotNamedByAKeyThatCannotBeRead) {
+  const Trusted unknown = WithUnknownKey();
+  const TrustedCertificates list({unknown, first_});
+  for (const std::string& hint : {std::string("<d:DEREncodedKeyValue>*</d:DEREncodedKeyValue>"),
+                                  std::string("<d:DEREncodedKeyValue/>"), RsaKeyValue("*", "AQAB"),
+                                  EcKeyValue("urn:oid:1.2.3", "AAAA")}) {
+    EXPECT_THAT(list.NamedBy(ReadHints(hint)), IsEmpty()) << hint;
+    EXPECT_THAT(list.NamedBy(ReadHints(hint + DerEncodedKey(*first_))),
+                ElementsAre(first_->GetPublicKey()))
+        << hint;
+  }
+  EXPECT_THROW(list.NamedBy(ReadHints(DerEncodedKey(*unknown))), Crypto::CryptoException);
+}
+
+// While it exists, OpenSSL does not provide SHA-1, nor any other algorithm.
+class NoAlgorithms {
+ public:
+  NoAlgorithms() { Set("no=such"); }
+  ~NoAlgorithms() { Set(""); }
+  NoAlgorithms(const NoAlgorithms&) = delete;
+  NoAlgorithms& operator=(const NoAlgorithms&) = delete;
+
+ private:
+  static void Set(const char* properties) {
+    EXPECT_EQ(EVP_set_default_properties(nullptr, properties), 1);
+  }
+};
+
+TEST_F(TrustedCertificatesTest, WithoutAKeyIdentifierAreNotNamedByAnEmptyOne) {
+  const auto der = MakeCertificateDer({.key = secondKey_.get(), .serial = "8"});
+  Trusted withoutIdentifier;
+  {
+    const NoAlgorithms scope;
+    withoutIdentifier = Crypto::CreateCertificateFromDer(der.data(), der.size());
+  }
+  const auto& decoded = dynamic_cast<const Crypto::CertificateImpl&>(*withoutIdentifier);
+  ASSERT_THAT(decoded.KeyIdentifier(), IsEmpty());
+  const TrustedCertificates list({withoutIdentifier, first_});
+  KeyInfo keyInfo;
+  keyInfo.subjectKeyIdentifiers = {{}};
+  EXPECT_THAT(list.NamedBy(keyInfo), IsEmpty());
+  keyInfo.subjectKeyIdentifiers.push_back(first_->SubjectKeyIdentifier());
+  EXPECT_THAT(list.NamedBy(keyInfo), ElementsAre(first_->GetPublicKey()));
+}
+
 }  // namespace
 }  // namespace Tarnik::Testing
