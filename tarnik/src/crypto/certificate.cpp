@@ -59,8 +59,16 @@ std::string NameText(const X509_NAME* name, const char* part) {
   return length > 0 ? std::string(text, static_cast<std::size_t>(length)) : std::string();
 }
 
+// RFC 5280, section 4.1.2.2 allows 20. The time to convert a number grows with the square of its
+// length, and anyone can send a certificate.
+constexpr int kMaxSerialBytes = 64;
+
 std::string SerialText(const ASN1_INTEGER* serial) {
   const OpenSsl::ErrorScope errors;
+  if (serial != nullptr && ASN1_STRING_length(serial) > kMaxSerialBytes) {
+    throw CryptoException("The certificate's serial number has more than " +
+                          std::to_string(kMaxSerialBytes) + " bytes.");
+  }
   const OpenSsl::OwnedBigNumber number(ASN1_INTEGER_to_BN(serial, nullptr));
   const OpenSsl::OwnedMemory<char> text(number == nullptr ? nullptr : BN_bn2dec(number.get()));
   if (text == nullptr) {

@@ -71,10 +71,11 @@ class NameTextReader {
 };
 
 bool NameTextReader::Read(std::vector<std::string>& parts) {
+  int attributes = 0;
   for (;;) {
     std::string& part = parts.emplace_back();
     do {
-      if (!ReadAttribute(part)) {
+      if (++attributes > kMaxNameAttributes || !ReadAttribute(part)) {
         return false;
       }
     } while (TakeIf('+'));

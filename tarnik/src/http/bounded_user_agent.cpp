@@ -220,6 +220,9 @@ class BoundedUserAgent final : public UserAgent, public ObjectImpl {
     try {
       return inner_->Wait(innerItem, timeoutMicroseconds);
     } catch (const IOException& cut) {
+      if (CauseOf(*limit_, cut) == nullptr) {
+        throw;
+      }
       failure = Translate(*limit_, cut);
     }
     failure->Throw();

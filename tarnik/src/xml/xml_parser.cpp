@@ -40,7 +40,8 @@ constexpr std::size_t kUsualBytes = std::size_t{8} * 1024;
 class Piece {
  public:
   Piece() : bytes_(new char[kUsualBytes]) {}
-  ~Piece() { explicit_bzero(bytes_.get(), filled_); }
+  // All of it, since a reader may have written something before it threw.
+  ~Piece() { explicit_bzero(bytes_.get(), capacity_); }
   Piece(const Piece&) = delete;
   Piece& operator=(const Piece&) = delete;
 

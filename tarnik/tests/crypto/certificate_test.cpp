@@ -56,6 +56,18 @@ TEST(CertificateTest, ReturnsItsFields) {
   EXPECT_EQ(certificate->ToString(), "Certificate of CN=J\xC3\xBCrgen,O=Test\\, Inc.");
 }
 
+// 2^511 and 2^512: without the limit, a number of a megabyte would take a minute.
+TEST(CertificateTest, HasASerialNumberOfLimitedLength) {
+  const OpenSsl::OwnedBigNumber number(BN_new());
+  ASSERT_EQ(BN_set_bit(number.get(), 511), 1);
+  const OpenSsl::OwnedMemory<char> longest(BN_bn2dec(number.get()));
+  EXPECT_EQ(MakeCertificate({.serial = longest.get()})->SerialNumber(), longest.get());
+  ASSERT_EQ(BN_set_bit(number.get(), 512), 1);
+  const OpenSsl::OwnedMemory<char> longer(BN_bn2dec(number.get()));
+  EXPECT_EQ(DecodeError(MakeCertificateDer({.serial = longer.get()})),
+            "The certificate's serial number has more than 64 bytes.");
+}
+
 TEST(CertificateTest, EscapesControlCharactersInNames) {
   const auto certificate = MakeCertificate({.commonName = std::string("a\0b", 3)});
   EXPECT_EQ(certificate->SubjectName(), "CN=a\\00b,O=Test\\, Inc.");

@@ -14,6 +14,7 @@
 #include <tarnik/crypto/certificate.h>
 
 #include "crypto/certificate_impl.h"
+#include "crypto/distinguished_name_reader.h"
 #include "support/openssl.h"
 #include "support/test_certificates.h"
 #include "support/test_data.h"
@@ -292,12 +293,19 @@ TEST(DistinguishedNameTest, IsReadFromTextsOfLimitedLength) {
   EXPECT_TRUE(name.Equals(name));
   const auto longer = DistinguishedName::FromText(longest + "x");
   EXPECT_FALSE(longer.Equals(longer));
-  std::string parts;
-  while (parts.size() + 5 <= DistinguishedName::kMaxText) {
-    parts += parts.empty() ? "C=" : ",C=";
+}
+
+TEST(DistinguishedNameTest, HasALimitedNumberOfAttributes) {
+  std::string parts = "C=";
+  for (int i = 1; i < Crypto::kMaxNameAttributes; ++i) {
+    parts += i % 2 == 0 ? ",C=" : "+L=";
   }
-  const auto many = DistinguishedName::FromText(parts);
-  EXPECT_TRUE(many.Equals(many));
+  const auto most = DistinguishedName::FromText(parts);
+  EXPECT_TRUE(most.Equals(most));
+  for (const char* more : {",C=", "+L="}) {
+    const auto tooMany = DistinguishedName::FromText(parts + more);
+    EXPECT_FALSE(tooMany.Equals(tooMany)) << more;
+  }
 }
 
 TEST(DistinguishedNameTest, LeavesTheErrorQueueUnchanged) {

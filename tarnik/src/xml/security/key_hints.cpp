@@ -15,6 +15,11 @@ using Bytes = std::vector<unsigned char>;
 
 constexpr std::string_view kCurvePrefix = "urn:oid:";
 
+template <class List>
+bool IsFull(const List& hints) noexcept {
+  return hints.size() == KeyHints::kMaxOfEachKind;
+}
+
 bool IsNamed(const ElementNode* element, std::string_view namespaceUri,
              std::string_view localName) {
   return element != nullptr && element->NamespaceUri() == namespaceUri &&
@@ -87,6 +92,9 @@ Bytes DigestIn(const ElementNode* element) {
 
 void ReadDigests(const ElementNode* data, KeyHints& hints) {
   for (ContentReader content(data); content.Peek() != nullptr; content.TakeAny()) {
+    if (IsFull(hints.certificateDigests)) {
+      return;
+    }
     const ElementNode* const digest = content.Peek();
     if (IsNamed(digest, kDs11Namespace, "X509Digest")) {
       hints.certificateDigests.push_back(
@@ -98,7 +106,9 @@ void ReadDigests(const ElementNode* data, KeyHints& hints) {
 void ReadHint(const ElementNode* element, KeyHints& hints) {
   if (IsNamed(element, kDsNamespace, "KeyValue") ||
       IsNamed(element, kDs11Namespace, "DEREncodedKeyValue")) {
-    ReadKey(element, hints);
+    if (!IsFull(hints.publicKeys)) {
+      ReadKey(element, hints);
+    }
   } else if (IsNamed(element, kDsNamespace, "X509Data")) {
     ReadDigests(element, hints);
   }

@@ -127,6 +127,14 @@ Bytes IdentityOf(const Crypto::PublicKey& key, const Certificate& certificate,
   return usual.empty() ? encoded : usual;
 }
 
+/// What certificates of one key have in common. An RSA key for PSS only is another key than one of
+/// the same numbers for every scheme, and may be restricted to one hash.
+const Bytes& CommonPartOf(const Crypto::PublicKey& key, const CertificateImpl* decoded,
+                          const Bytes& identity) {
+  const bool isForPssOnly = key.Algorithm() == Crypto::KeyAlgorithm::kRsaPss;
+  return isForPssOnly && decoded != nullptr ? decoded->SubjectPublicKeyInfo() : identity;
+}
+
 Ref<const Crypto::PublicKey> KnownKeyOf(const Certificate& certificate) {
   try {
     return certificate.GetPublicKey();
@@ -161,7 +169,8 @@ void TrustedCertificates::CollectKeys() {
       continue;
     }
     trusted.identity = IdentityOf(*key, *trusted.certificate, trusted.decoded.get());
-    const auto [place, isNew] = places.emplace(trusted.identity, keys_.size());
+    const auto [place, isNew] =
+        places.emplace(CommonPartOf(*key, trusted.decoded.get(), trusted.identity), keys_.size());
     trusted.key = place->second;
     if (isNew) {
       keys_.push_back(key);

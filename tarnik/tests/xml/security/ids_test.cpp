@@ -21,9 +21,8 @@ std::string IdOf(const std::string& attributes) {
 }
 
 TEST(PossibleIdTest, IsTheValueOfAnIdInAnyLetterCase) {
-  for (const char* name :
-       {"id", "Id", "iD", "ID", "xml:id", "xmlns:p=\"urn:p\" p:Id", "xmlns:p=\"urn:p\" p:iD",
-        "AssertionID"}) {
+  for (const char* name : {"id", "Id", "iD", "ID", "xml:id", "xmlns:p=\"urn:p\" p:Id",
+                           "xmlns:p=\"urn:p\" p:iD", "AssertionID"}) {
     EXPECT_EQ(IdOf(std::string(name) + "=\"_1\""), "_1") << name;
   }
 }
@@ -41,8 +40,8 @@ TEST(PossibleIdTest, KeepsTheLetterCaseOfTheValue) {
 }
 
 TEST(PossibleIdTest, IsNotInAttributesOfOtherNames) {
-  for (const char* name :
-       {"i", "d", "idd", "xid", "assertionid", "AssertionId", "_id", "xmlns", "xmlns:id=\"urn:p\" id:x"}) {
+  for (const char* name : {"i", "d", "idd", "xid", "assertionid", "AssertionId", "_id", "xmlns",
+                           "xmlns:id=\"urn:p\" id:x"}) {
     EXPECT_EQ(IdOf(std::string(name) + "=\"urn:1\""), "none") << name;
   }
 }

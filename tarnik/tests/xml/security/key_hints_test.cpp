@@ -85,6 +85,20 @@ TEST(KeyHintsTest, AreEmptyWhenTheyCannotBeRead) {
   }
 }
 
+TEST(KeyHintsTest, AreReadOnlyUpToALimit) {
+  std::string keys;
+  std::string digests;
+  for (int i = 0; i < 20; ++i) {
+    keys += "<KeyValue><RSAKeyValue/></KeyValue>";
+    digests += "<k:X509Digest Algorithm=\"a\">AQ==</k:X509Digest>";
+  }
+  const std::string begin = "<X509Data xmlns:k=\"http://www.w3.org/2009/xmldsig11#\">";
+  const KeyHints hints = ReadKeyHints(
+      ReadHints(keys + begin + digests + "</X509Data>" + begin + digests + "</X509Data>"));
+  EXPECT_EQ(hints.publicKeys.size(), 16U);
+  EXPECT_EQ(hints.certificateDigests.size(), 16U);
+}
+
 TEST(KeyHintsTest, OfOtherKindsAreSkipped) {
   for (const char* content :
        {"<KeyValue/>", "<KeyValue><DSAKeyValue/></KeyValue>", "<KeyName>AQID</KeyName>",

@@ -217,6 +217,44 @@ TEST_F(TrustedCertificatesTest, AreNamedByAKeyInAnotherForm) {
               ElementsAre(certificate->GetPublicKey()));
 }
 
+// A certificate of the key that `SharedRsaKey` has, but for PSS only.
+Trusted MakePssCertificate() {
+  OSSL_PARAM* numbers = nullptr;
+  Require(EVP_PKEY_todata(SharedRsaKey(), EVP_PKEY_PUBLIC_KEY, &numbers) == 1, "numbers");
+  const OpenSsl::Owned<OSSL_PARAM, OSSL_PARAM_free> owner(numbers);
+  const OpenSsl::OwnedKeyContext context(EVP_PKEY_CTX_new_from_name(nullptr, "RSA-PSS", nullptr));
+  EVP_PKEY* made = nullptr;
+  Require(EVP_PKEY_fromdata_init(context.get()) == 1 &&
+              EVP_PKEY_fromdata(context.get(), &made, EVP_PKEY_PUBLIC_KEY, numbers) == 1,
+          "PSS key");
+  const OpenSsl::OwnedKey key(made);
+  const auto other = MakeCertificateDer({.commonName = "pss", .serial = "8"});
+  const unsigned char* position = other.data();
+  const OpenSsl::OwnedCertificate certificate(
+      d2i_X509(nullptr, &position, static_cast<long>(other.size())));
+  Require(X509_set_pubkey(certificate.get(), made) == 1 &&
+              X509_sign(certificate.get(), SharedRsaKey(), EVP_sha256()) > 0,
+          "PSS certificate");
+  unsigned char* bytes = nullptr;
+  const int length = i2d_X509(certificate.get(), &bytes);
+  const OpenSsl::OwnedMemory<unsigned char> der(bytes);
+  return Crypto::CreateCertificateFromDer(bytes, static_cast<std::size_t>(length));
+}
+
+// Otherwise the order of the list would decide which signatures are accepted, and a certificate
+// that is not named could replace one that is.
+TEST_F(TrustedCertificatesTest, OfAKeyForPssOnlyHaveAnotherKey) {
+  const Trusted pss = MakePssCertificate();
+  const Trusted rsa = MakeCertificate({.serial = "9"});
+  ASSERT_EQ(pss->GetPublicKey()->Algorithm(), Crypto::KeyAlgorithm::kRsaPss);
+  const auto all = TrustedCertificates({pss, first_, rsa}).NamedBy(KeyInfo());
+  EXPECT_THAT(all, ElementsAre(pss->GetPublicKey(), first_->GetPublicKey(), rsa->GetPublicKey()));
+  KeyInfo keyInfo;
+  keyInfo.subjectNames = {pss->SubjectName(), first_->SubjectName()};
+  EXPECT_THAT(TrustedCertificates({rsa, pss, first_, second_}).NamedBy(keyInfo),
+              testing::Contains(pss->GetPublicKey()));
+}
+
 // A certificate whose key the library does not know.
 class UnknownKeyTest : public TrustedCertificatesTest {
  protected:

@@ -1,6 +1,7 @@
 #ifndef TARNIK_XML_SECURITY_KEY_HINTS_H
 #define TARNIK_XML_SECURITY_KEY_HINTS_H
 
+#include <cstddef>
 #include <string>
 #include <vector>
 
@@ -12,6 +13,9 @@ namespace Tarnik::Xml::Security {
 /// What a ds:KeyInfo says about the key itself, besides the content of `KeyInfo`. These are
 /// untrusted hints too: anybody can write any key into a message.
 struct KeyHints {
+  /// Further hints of a kind are not read.
+  static constexpr std::size_t kMaxOfEachKind = 16;
+
   /// A dsig11:X509Digest (XML Signature 1.1, section 4.5.4): the digest of the signer's
   /// certificate.
   struct CertificateDigest {
