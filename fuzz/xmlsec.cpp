@@ -82,7 +82,7 @@ void IgnoreError(const char* /*file*/, int /*line*/, const char* /*function*/,
 
 void IgnoreMessage(void* /*context*/, const char* /*format*/, ...) {}
 
-void Initialize() {
+void Initialise() {
   static const bool isReady = [] {
     xmlInitParser();
     const bool isDone =
@@ -153,7 +153,7 @@ xmlNode* FindSignature(xmlDoc* document, const std::string& id) {
 
 /// Null for a text that libxml2 refuses.
 Document Parse(const std::string& xml) {
-  Initialize();
+  Initialise();
   const Parser parser(xmlNewParserCtxt());
   constexpr int kOptions = XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING;
   Document document(xmlCtxtReadMemory(parser.get(), xml.data(), static_cast<int>(xml.size()),
