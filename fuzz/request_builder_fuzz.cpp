@@ -23,6 +23,7 @@
 #include "support/fake_saml_token.h"
 #include "support/key_texts.h"
 #include "support/test_certificates.h"
+#include "value_model.h"
 #include "xml_input.h"
 #include "xmlsec.h"
 
@@ -43,13 +44,6 @@ struct Holder {
   std::string certificate;
 };
 
-std::string Base64(const unsigned char* bytes, std::size_t size) {
-  std::string text(4 * ((size + 2) / 3) + 1, '\0');
-  text.resize(static_cast<std::size_t>(EVP_EncodeBlock(
-      reinterpret_cast<unsigned char*>(text.data()), bytes, static_cast<int>(size))));
-  return text;
-}
-
 const Holder& TheHolder() {
   static const Holder holder = [] {
     Fuzz::FixRandomness(1);
@@ -60,7 +54,7 @@ const Holder& TheHolder() {
     made.config.privateKey =
         Tarnik::Crypto::CreatePrivateKeyFromPem(Tarnik::Testing::ToPkcs8Pem(made.key.get()));
     made.certificate =
-        Base64(made.config.certificate->DerBytes(), made.config.certificate->DerLength());
+        Fuzz::Base64Of(made.config.certificate->DerBytes(), made.config.certificate->DerLength());
     return made;
   }();
   return holder;

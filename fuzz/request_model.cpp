@@ -6,10 +6,9 @@
 #include <limits>
 #include <utility>
 
-#include <openssl/evp.h>
-
 #include "deployment.h"
 #include "fixed_clock.h"
+#include "value_model.h"
 
 namespace Fuzz {
 namespace {
@@ -54,15 +53,6 @@ long After(long now, std::int64_t seconds) {
              : sum;
 }
 
-std::string Base64(const std::string& bytes) {
-  std::string text(4 * ((bytes.size() + 2) / 3) + 1, '\0');
-  const int size = EVP_EncodeBlock(reinterpret_cast<unsigned char*>(text.data()),
-                                   reinterpret_cast<const unsigned char*>(bytes.data()),
-                                   static_cast<int>(bytes.size()));
-  text.resize(static_cast<std::size_t>(size));
-  return text;
-}
-
 Element Text(const std::string& uri, const std::string& name, const std::string& text) {
   return {uri, name, {}, text};
 }
@@ -83,7 +73,7 @@ Element Leg(const RequestCase& request) {
           "BinaryExchange",
           {{"EncodingType", kBase64},
            {"ValueType", "http://schemas.xmlsoap.org/ws/2005/02/trust/spnego"}},
-          Base64(request.leg)};
+          Base64Of(request.leg)};
 }
 
 Element Participants(const std::set<std::string>& audiences) {

@@ -1,7 +1,8 @@
 // The input makes a document and the template of its signature, which xmlsec1 and OpenSSL fill in,
-// and then edits the text. Every signature that is accepted is valid for xmlsec1 too, which digests
-// the element that the reference names, and uses only the algorithms of the closed list. A
-// signature of a supported form that nobody has edited is accepted.
+// and then edits the text. Every signature that is accepted is valid for xmlsec1 too, with the key
+// of a trusted certificate. xmlsec1 digests the element that the reference names, and the signature
+// uses only the algorithms of the closed list. A signature of a supported form that nobody has
+// edited is accepted exactly when its hints select the key of its signer.
 #include <algorithm>
 #include <array>
 #include <string>
@@ -15,8 +16,8 @@
 
 #include "fixed_random.h"
 #include "input.h"
-#include "support/openssl.h"
-#include "support/test_certificates.h"
+#include "named_signers.h"
+#include "value_model.h"
 #include "xml_edits.h"
 #include "xml_input.h"
 #include "xmlsec.h"
@@ -69,97 +70,14 @@ bool IsAmong(const List& list, std::size_t supported, const std::string& text) {
   return std::find(list.begin(), list.begin() + supported, text) != list.begin() + supported;
 }
 
-struct Signer {
-  OpenSsl::OwnedKey key;
-  bool isEc = false;
-  Ref<const Crypto::Certificate> certificate = {};
-};
-
-// The last two are too short and a stranger's.
-constexpr std::size_t kStrongSigners = 4;
-constexpr std::size_t kSigners = 5;
-const std::vector<Signer>& Signers() {
-  static const std::vector<Signer> signers = [] {
-    Fuzz::FixRandomness(1);
-    std::vector<Signer> made;
-    made.push_back({Tarnik::Testing::MakeRsaKey(2048)});
-    for (const char* curve : {"P-256", "P-384", "P-521"}) {
-      made.push_back({Tarnik::Testing::MakeEcKey(curve), true});
-    }
-    made.push_back({Tarnik::Testing::MakeRsaKey(1024)});
-    made.push_back({Tarnik::Testing::MakeEcKey("P-256"), true});
-    for (Signer& signer : made) {
-      const std::string number = std::to_string(&signer - made.data());
-      Tarnik::Testing::CertificateRecipe recipe;
-      recipe.key = signer.key.get();
-      recipe.commonName = "signer" + number;
-      recipe.serial = number.c_str();
-      recipe.withKeyIdentifier = true;
-      signer.certificate = Tarnik::Testing::MakeCertificate(recipe);
-    }
-    return made;
-  }();
-  return signers;
-}
-
-std::string Encoded(const unsigned char* bytes, std::size_t size) {
-  std::string text(4 * ((size + 2) / 3) + 1, '\0');
-  text.resize(static_cast<std::size_t>(EVP_EncodeBlock(
-      reinterpret_cast<unsigned char*>(text.data()), bytes, static_cast<int>(size))));
-  return text;
-}
-
-/// What names the signer's key, or with `kStranger` another trusted one.
-enum class Hint { kNone, kCertificate, kIssuerSerial, kKeyIdentifier, kSubject, kStranger };
-
-std::string KeyInfoOf(const Crypto::Certificate& own, const Crypto::Certificate& stranger,
-                      Hint hint) {
-  std::string content;
-  switch (hint) {
-    case Hint::kNone:
-      return "";
-    case Hint::kCertificate:
-    case Hint::kStranger: {
-      const Crypto::Certificate& named = hint == Hint::kStranger ? stranger : own;
-      content = "<ds:X509Certificate>" + Encoded(named.DerBytes(), named.DerLength()) +
-                "</ds:X509Certificate>";
-      break;
-    }
-    case Hint::kIssuerSerial:
-      content = "<ds:X509IssuerSerial><ds:X509IssuerName>" + own.IssuerName() +
-                "</ds:X509IssuerName><ds:X509SerialNumber>" + own.SerialNumber() +
-                "</ds:X509SerialNumber></ds:X509IssuerSerial>";
-      break;
-    case Hint::kKeyIdentifier:
-      content = "<ds:X509SKI>" +
-                Encoded(own.SubjectKeyIdentifier().data(), own.SubjectKeyIdentifier().size()) +
-                "</ds:X509SKI>";
-      break;
-    case Hint::kSubject:
-      content = "<ds:X509SubjectName>" + own.SubjectName() + "</ds:X509SubjectName>";
-      break;
-  }
-  return "<ds:KeyInfo><ds:X509Data>" + content + "</ds:X509Data></ds:KeyInfo>";
-}
-
-Ref<const Xml::Security::KeyInfoResolver> ResolverFor(const Signer& signer, Hint hint) {
-  std::vector<Ref<const Crypto::Certificate>> trusted{signer.certificate};
-  if (hint != Hint::kNone) {
-    trusted.push_back(Signers().back().certificate);
-  }
-  return hint == Hint::kIssuerSerial
-             ? Xml::Security::CreateCertificateIssuerResolver(std::move(trusted))
-             : Xml::Security::CreateTrustedCertificatesResolver(std::move(trusted));
-}
-
 /// Makes documents with a template, and knows whether the signature is of a supported form.
 class Maker {
  public:
   explicit Maker(FuzzedDataProvider& input) : input_(input) {}
 
-  std::string Make(const Signer& signer) {
-    const std::string method = Method(signer.isEc);
-    isSupported_ = isSupported_ && (method.find("ecdsa") != std::string::npos) == signer.isEc;
+  std::string Make(bool isEc) {
+    const std::string method = Method(isEc);
+    isSupported_ = isSupported_ && (method.find("ecdsa") != std::string::npos) == isEc;
     std::string info = "<ds:CanonicalizationMethod Algorithm=\"" + Pick(kForms, kSupportedForms) +
                        "\"/><ds:SignatureMethod Algorithm=\"" + method + "\"/>";
     const int references = input_.ConsumeIntegralInRange(1, 3);
@@ -203,10 +121,16 @@ class Maker {
 
   std::string Form() {
     const std::string form = Pick(kForms, kSupportedForms);
-    if (form.find("exc-c14n") == std::string::npos || input_.ConsumeBool()) {
-      return "<ds:Transform Algorithm=\"" + form + "\"/>";
+    return form.find("exc-c14n") == std::string::npos ? "<ds:Transform Algorithm=\"" + form + "\"/>"
+                                                      : Transform(form);
+  }
+
+  // Some signers also write InclusiveNamespaces where they have no effect.
+  std::string Transform(const std::string& algorithm) {
+    if (input_.ConsumeBool()) {
+      return "<ds:Transform Algorithm=\"" + algorithm + "\"/>";
     }
-    return "<ds:Transform Algorithm=\"" + form +
+    return "<ds:Transform Algorithm=\"" + algorithm +
            "\"><i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2001/10/xml-exc-c14n#\" "
            "PrefixList=\"unused #default r\"/></ds:Transform>";
   }
@@ -218,7 +142,7 @@ class Maker {
         input_.ConsumeIntegralInRange(0, 7) == 0 ? !Encloses(target) : Encloses(target);
     isSupported_ = isSupported_ && isEnveloped == Encloses(target);
     if (isEnveloped) {
-      transforms = std::string("<ds:Transform Algorithm=\"") + kEnveloped + "\"/>";
+      transforms = Transform(kEnveloped);
     }
     for (int forms = input_.ConsumeIntegralInRange(0, 4) * 2 / 5; forms > 0; --forms) {
       transforms += Form();
@@ -246,13 +170,13 @@ const Xml::ElementNode* FirstSignature(const Xml::Document& document) {
 
 /// The URIs of the references of a valid signature; nothing for any other.
 std::optional<std::vector<std::string>> AcceptedReferences(const std::string& xml,
-                                                           const Signer& signer, Hint hint) {
+                                                           const Fuzz::Trust& trust) {
   const auto document = Fuzz::ParseXml(xml);
   const Xml::ElementNode* element = document == nullptr ? nullptr : FirstSignature(*document);
   if (element == nullptr || Fuzz::HasOddNamespace(*document)) {
     return std::nullopt;
   }
-  const auto resolver = ResolverFor(signer, hint);
+  const auto resolver = Fuzz::ResolverFor(trust);
   std::vector<std::string> uris;
   try {
     const auto signature =
@@ -293,33 +217,79 @@ void CheckAccepted(const std::vector<std::string>& uris, const Fuzz::ReadSignatu
   }
 }
 
+// Mostly all signers but the strangers, so that hints have to select one.
+Fuzz::Trust TrustFor(std::size_t signer, FuzzedDataProvider& input) {
+  Fuzz::Trust trust;
+  trust.isByIssuer = input.ConsumeIntegralInRange(0, 5) == 5;
+  if (input.ConsumeIntegralInRange(0, 3) == 3 && signer < Fuzz::kTrustedSigners) {
+    trust.signers = {signer};
+    return trust;
+  }
+  for (std::size_t i = 0; i < Fuzz::kTrustedSigners; ++i) {
+    trust.signers.push_back(i);
+  }
+  if (input.ConsumeBool()) {
+    std::reverse(trust.signers.begin(), trust.signers.end());
+  }
+  return trust;
+}
+
+// Mostly those that name the signer.
+std::vector<Fuzz::Hint> HintsFor(std::size_t signer, FuzzedDataProvider& input) {
+  std::vector<Fuzz::Hint> hints;
+  for (int left = input.ConsumeIntegralInRange(0, 6) * 2 / 5; left > 0; --left) {
+    const auto kind =
+        static_cast<Fuzz::HintKind>(input.ConsumeIntegralInRange(0, Fuzz::kHintKinds - 1));
+    const auto named = input.ConsumeIntegralInRange<std::size_t>(0, 2 * Fuzz::kSigners - 1);
+    hints.push_back({kind, named < Fuzz::kSigners ? named : signer});
+  }
+  return hints;
+}
+
+// As signers do that omit leading zeros which both halves of an ECDSA value have.
+void ShortenValue(std::string& xml) {
+  const std::string tag = "<ds:SignatureValue>";
+  const std::size_t begin = xml.find(tag) + tag.size();
+  const std::size_t end = xml.find("</ds:SignatureValue>");
+  auto value = Fuzz::BytesOf(xml.substr(begin, end - begin)).value();
+  while (value[0] == 0 && value[value.size() / 2] == 0) {
+    value.erase(value.begin() + static_cast<std::ptrdiff_t>(value.size() / 2));
+    value.erase(value.begin());
+  }
+  xml.replace(begin, end - begin, Fuzz::Base64Of(value.data(), value.size()));
+}
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-  const std::vector<Signer>& signers = Signers();
+  const std::vector<Fuzz::NamedSigner>& signers = Fuzz::NamedSigners();
   Fuzz::FixRandomness(size);
   FuzzedDataProvider input(data, size);
-  const auto index = input.ConsumeIntegralInRange<std::size_t>(0, kSigners - 1);
-  const Signer& signer = signers[index];
-  const auto hint = static_cast<Hint>(input.ConsumeIntegralInRange(0, 5));
+  const auto index = input.ConsumeIntegralInRange<std::size_t>(0, Fuzz::kSigners - 1);
+  const Fuzz::NamedSigner& signer = signers[index];
+  const Fuzz::Trust trust = TrustFor(index, input);
+  const std::vector<Fuzz::Hint> hints = HintsFor(index, input);
+  const bool isShort = signer.isEc && input.ConsumeBool();
   const int edits = std::max(input.ConsumeIntegralInRange(-1, 3), 0);
   Maker maker(input);
-  const std::string text = maker.Make(signer);
+  const std::string text = maker.Make(signer.isEc);
   std::string xml = Fuzz::SignWithXmlSec(text, signer.key.get());
-  const bool isAcceptable =
-      maker.IsSupported() && index < kStrongSigners && hint != Hint::kStranger;
+  const bool isTrusted = index < Fuzz::kStrongSigners;
+  const bool isSelected = isTrusted && Fuzz::IsSelected(index, trust, hints);
+  const bool isAcceptable = maker.IsSupported() && isSelected;
   if (xml.empty()) {
     Fuzz::Require(!isAcceptable);
     xml = text;
+  } else if (isShort) {
+    ShortenValue(xml);
   }
-  xml.insert(xml.find("</ds:Signature>"),
-             KeyInfoOf(*signer.certificate, *signers.back().certificate, hint));
+  xml.insert(xml.find("</ds:Signature>"), Fuzz::KeyInfoOf(hints));
   for (int i = 0; i < edits; ++i) {
     Fuzz::EditXml(xml, input);
   }
-  const auto accepted = AcceptedReferences(xml, signer, hint);
+  const auto accepted = AcceptedReferences(xml, trust);
   if (accepted) {
-    Fuzz::Require(index < kStrongSigners);
+    Fuzz::Require(isTrusted && (edits > 0 || isSelected));
     CheckAccepted(*accepted, Fuzz::VerifyWithXmlSec(xml, signer.key.get()));
   } else {
     Fuzz::Require(edits > 0 || !isAcceptable);

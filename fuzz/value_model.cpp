@@ -6,6 +6,8 @@
 #include <regex>
 #include <string_view>
 
+#include <openssl/evp.h>
+
 namespace Fuzz {
 namespace {
 
@@ -136,6 +138,17 @@ std::optional<std::vector<unsigned char>> BytesOf(const std::string& text) {
   }
   const bool isWhole = length % 4 == 0 && padding <= 2 && count == padding * 2;
   return isWhole && (bits & ((1U << count) - 1)) == 0 ? std::optional(bytes) : std::nullopt;
+}
+
+std::string Base64Of(const unsigned char* bytes, std::size_t size) {
+  std::string text(4 * ((size + 2) / 3) + 1, '\0');
+  text.resize(static_cast<std::size_t>(EVP_EncodeBlock(
+      reinterpret_cast<unsigned char*>(text.data()), bytes, static_cast<int>(size))));
+  return text;
+}
+
+std::string Base64Of(const std::string& bytes) {
+  return Base64Of(reinterpret_cast<const unsigned char*>(bytes.data()), bytes.size());
 }
 
 std::optional<unsigned long> CountOf(const std::string& text) {

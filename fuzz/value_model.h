@@ -1,6 +1,7 @@
 #ifndef FUZZ_VALUE_MODEL_H
 #define FUZZ_VALUE_MODEL_H
 
+#include <cstddef>
 #include <optional>
 #include <string>
 #include <vector>
@@ -14,6 +15,9 @@ namespace Fuzz {
 std::optional<long> DateOf(const std::string& text);
 /// The bytes of a Base64 text in its only spelling (RFC 4648, section 4), apart from white space.
 std::optional<std::vector<unsigned char>> BytesOf(const std::string& text);
+/// The Base64 text of bytes, as OpenSSL writes it.
+std::string Base64Of(const unsigned char* bytes, std::size_t size);
+std::string Base64Of(const std::string& bytes);
 /// A number from 0 to 4,294,967,295 of digits, possibly with a sign.
 std::optional<unsigned long> CountOf(const std::string& text);
 /// "true", "false", "1" or "0", in any letter case.

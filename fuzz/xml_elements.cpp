@@ -1,23 +1,12 @@
 #include "xml_elements.h"
 
-#include <memory>
-
-#include <libxml/parser.h>
 #include <libxml/parserInternals.h>
 #include <libxml/tree.h>
 
+#include "xml_tree.h"
+
 namespace Fuzz {
 namespace {
-
-struct Free {
-  void operator()(xmlParserCtxt* parser) const { xmlFreeParserCtxt(parser); }
-  void operator()(xmlDoc* document) const { xmlFreeDoc(document); }
-  void operator()(xmlChar* text) const { xmlFree(text); }
-};
-
-std::string TextOf(const xmlChar* text) {
-  return text == nullptr ? "" : reinterpret_cast<const char*>(text);
-}
 
 std::string NameOf(const xmlAttr& attribute) {
   const std::string name = TextOf(attribute.name);
@@ -28,9 +17,9 @@ Element Read(const xmlNode& node) {
   Element element{node.ns == nullptr ? "" : TextOf(node.ns->href), TextOf(node.name)};
   for (const xmlAttr* attribute = node.properties; attribute != nullptr;
        attribute = attribute->next) {
-    const std::unique_ptr<xmlChar, Free> value(
-        xmlNodeListGetString(node.doc, attribute->children, 1));
-    element.attributes[NameOf(*attribute)] = TextOf(value.get());
+    xmlChar* const value = xmlNodeListGetString(node.doc, attribute->children, 1);
+    element.attributes[NameOf(*attribute)] = TextOf(value);
+    xmlFree(value);
   }
   for (const xmlNode* child = node.children; child != nullptr; child = child->next) {
     if (child->type == XML_TEXT_NODE || child->type == XML_CDATA_SECTION_NODE) {
@@ -42,28 +31,17 @@ Element Read(const xmlNode& node) {
   return element;
 }
 
-}  // namespace
-
-std::optional<Element> ReadWithLibXml2(const std::string& xml) {
-  const std::unique_ptr<xmlParserCtxt, Free> parser(xmlNewParserCtxt());
-  constexpr int kOptions =
-      XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING | XML_PARSE_HUGE;
-  const std::unique_ptr<xmlDoc, Free> document(xmlCtxtReadMemory(
-      parser.get(), xml.data(), static_cast<int>(xml.size()), nullptr, nullptr, kOptions));
-  if (document == nullptr || parser->wellFormed == 0 || parser->nsWellFormed == 0) {
-    return std::nullopt;
-  }
-  return Read(*xmlDocGetRootElement(document.get()));
-}
-
-namespace {
-
 // libxml2 also decodes characters that are longer than they need be, and stray octets.
 int ShortestLength(int character) {
   return character < 0x80 ? 1 : character < 0x800 ? 2 : character < 0x10000 ? 3 : 4;
 }
 
 }  // namespace
+
+std::optional<Element> ReadWithLibXml2(const std::string& xml) {
+  const XmlTree tree = ParseByLibXml2(xml);
+  return tree == nullptr ? std::nullopt : std::optional(Read(*xmlDocGetRootElement(tree.get())));
+}
 
 bool IsXmlText(const std::string& text) {
   const auto* bytes = reinterpret_cast<const unsigned char*>(text.data());

@@ -11,10 +11,6 @@ struct FreeContext {
   void operator()(xmlParserCtxt* context) const noexcept { xmlFreeParserCtxt(context); }
 };
 
-std::string TextOf(const xmlChar* text) {
-  return text == nullptr ? std::string() : reinterpret_cast<const char*>(text);
-}
-
 bool IsText(const xmlNode& node) {
   return node.type == XML_TEXT_NODE || node.type == XML_CDATA_SECTION_NODE;
 }
@@ -34,6 +30,10 @@ XmlTree ParseByLibXml2(const std::string& text) {
   const bool isWellFormed =
       tree != nullptr && context->wellFormed != 0 && context->nsWellFormed != 0;
   return isWellFormed ? std::move(tree) : nullptr;
+}
+
+std::string TextOf(const xmlChar* text) {
+  return text == nullptr ? std::string() : reinterpret_cast<const char*>(text);
 }
 
 std::vector<Item> ChildrenOf(const xmlNode* element) {

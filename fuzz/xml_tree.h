@@ -15,8 +15,12 @@ struct FreeDocument {
 };
 using XmlTree = std::unique_ptr<xmlDoc, FreeDocument>;
 
-/// The tree that libxml2 builds, or null if it finds the text not to be well-formed.
+/// The tree that libxml2 builds, or null if it finds the text not to be well-formed. It fetches
+/// nothing and has no limits of size.
 XmlTree ParseByLibXml2(const std::string& text);
+
+/// A text of libxml2; empty for null.
+std::string TextOf(const xmlChar* text);
 
 /// An element, a text or another node inside an element. Texts that follow each other directly,
 /// CDATA sections too, are one text.

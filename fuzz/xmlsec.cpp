@@ -1,6 +1,5 @@
 #include "xmlsec.h"
 
-#include <algorithm>
 #include <memory>
 #include <optional>
 #include <string_view>
@@ -20,6 +19,8 @@
 
 #include "input.h"
 #include "support/openssl.h"
+#include "value_model.h"
+#include "xml_tree.h"
 
 // xmlsec1 does not free everything when it refuses a document.
 extern "C" const char* __lsan_default_suppressions() {
@@ -36,8 +37,6 @@ struct FreeWith {
     free(object);
   }
 };
-using Document = std::unique_ptr<xmlDoc, FreeWith<xmlFreeDoc>>;
-using Parser = std::unique_ptr<xmlParserCtxt, FreeWith<xmlFreeParserCtxt>>;
 using Context = std::unique_ptr<xmlSecDSigCtx, FreeWith<xmlSecDSigCtxDestroy>>;
 using ElementText = std::unique_ptr<xmlChar, void (*)(void*)>;
 
@@ -82,7 +81,7 @@ void IgnoreError(const char* /*file*/, int /*line*/, const char* /*function*/,
 
 void IgnoreMessage(void* /*context*/, const char* /*format*/, ...) {}
 
-void Initialize() {
+void Initialise() {
   static const bool isReady = [] {
     xmlInitParser();
     const bool isDone =
@@ -98,18 +97,14 @@ const xmlChar* AsXml(std::string_view text) {
   return reinterpret_cast<const xmlChar*>(text.data());
 }
 
-std::string TextOf(const xmlChar* text) {
-  return text == nullptr ? "" : reinterpret_cast<const char*>(text);
-}
-
-std::string TextOf(xmlSecBuffer* buffer) {
+std::string OctetsIn(xmlSecBuffer* buffer) {
   return buffer == nullptr ? ""
                            : std::string(reinterpret_cast<const char*>(xmlSecBufferGetData(buffer)),
                                          xmlSecBufferGetSize(buffer));
 }
 
-std::string AttributeOf(xmlNode* element, const char* name) {
-  const ElementText value(xmlGetNoNsProp(element, AsXml(name)), xmlFree);
+std::string AlgorithmOf(xmlNode* element) {
+  const ElementText value(xmlGetNoNsProp(element, AsXml("Algorithm")), xmlFree);
   return TextOf(value.get());
 }
 
@@ -151,15 +146,11 @@ xmlNode* FindSignature(xmlDoc* document, const std::string& id) {
   return attribute == nullptr ? nullptr : attribute->parent;
 }
 
-/// Null for a text that libxml2 refuses.
-Document Parse(const std::string& xml) {
-  Initialize();
-  const Parser parser(xmlNewParserCtxt());
-  constexpr int kOptions = XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING;
-  Document document(xmlCtxtReadMemory(parser.get(), xml.data(), static_cast<int>(xml.size()),
-                                      nullptr, nullptr, kOptions));
-  if (document == nullptr || parser->wellFormed == 0 || parser->nsWellFormed == 0 ||
-      xmlGetIntSubset(document.get()) != nullptr) {
+/// Null for a text that libxml2 refuses, and for one with a document type declaration.
+XmlTree Parse(const std::string& xml) {
+  Initialise();
+  XmlTree document = ParseByLibXml2(xml);
+  if (document == nullptr || xmlGetIntSubset(document.get()) != nullptr) {
     return nullptr;
   }
   RegisterIds(document.get(), xmlDocGetRootElement(document.get()));
@@ -191,16 +182,16 @@ void CollectAlgorithms(xmlNode* signedInfo, ReadSignature& reading) {
   for (xmlNode* part = xmlSecGetNextElementNode(signedInfo->children); part != nullptr;
        part = xmlSecGetNextElementNode(part->next)) {
     if (TextOf(part->name) == "CanonicalizationMethod") {
-      reading.canonicalizationMethod = AttributeOf(part, "Algorithm");
+      reading.canonicalizationMethod = AlgorithmOf(part);
     }
     if (TextOf(part->name) != "Reference") {
       continue;
     }
     for (xmlNode* node = Find(part, "Transform"); node != nullptr;
          node = xmlSecGetNextElementNode(node->next)) {
-      reading.transforms.push_back(AttributeOf(node, "Algorithm"));
+      reading.transforms.push_back(AlgorithmOf(node));
     }
-    reading.digestMethods.push_back(AttributeOf(Find(part, "DigestMethod"), "Algorithm"));
+    reading.digestMethods.push_back(AlgorithmOf(Find(part, "DigestMethod")));
   }
 }
 
@@ -213,14 +204,14 @@ bool CollectReferences(xmlSecDSigCtx* context, ReadSignature& reading) {
         xmlSecPtrListGetItem(&context->signedInfoReferences, i));
     isRight = isRight && reference->status == xmlSecDSigStatusSucceeded;
     reading.references.push_back(
-        {TextOf(reference->uri), TextOf(xmlSecDSigReferenceCtxGetPreDigestBuffer(reference))});
+        {TextOf(reference->uri), OctetsIn(xmlSecDSigReferenceCtxGetPreDigestBuffer(reference))});
   }
   return isRight && count > 0;
 }
 
 // The octets that are signed, if `method` was replaced by `kKnownMethod` before.
 std::string SignedOctets(xmlSecDSigCtx* context, const Method& method) {
-  std::string octets = TextOf(xmlSecDSigCtxGetPreSignBuffer(context));
+  std::string octets = OctetsIn(xmlSecDSigCtxGetPreSignBuffer(context));
   const std::size_t element = octets.find("SignatureMethod");
   const std::size_t place =
       element == std::string::npos ? element : octets.find(kKnownMethod, element);
@@ -234,29 +225,17 @@ bool StartPss(EVP_PKEY_CTX* context) {
          EVP_PKEY_CTX_set_rsa_pss_saltlen(context, RSA_PSS_SALTLEN_DIGEST) == 1;
 }
 
-std::string DecodedBase64(std::string text) {
-  std::erase_if(text, [](char c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; });
-  const auto padding = static_cast<std::size_t>(std::count(text.begin(), text.end(), '='));
-  std::string bytes(text.size(), '\0');
-  const int size = EVP_DecodeBlock(reinterpret_cast<unsigned char*>(bytes.data()), AsXml(text),
-                                   static_cast<int>(text.size()));
-  bytes.resize(size < 0 ? 0
-                        : static_cast<std::size_t>(size) -
-                              std::min<std::size_t>(padding, static_cast<std::size_t>(size)));
-  return bytes;
-}
-
 bool IsPssValue(const std::string& octets, xmlNode* signature, const Method& method,
                 EVP_PKEY* key) {
   const ElementText content(xmlNodeGetContent(Find(signature, "SignatureValue")), xmlFree);
-  const std::string value = DecodedBase64(TextOf(content.get()));
+  const auto value = BytesOf(TextOf(content.get()));
   const Tarnik::OpenSsl::OwnedDigestContext context(EVP_MD_CTX_new());
   EVP_PKEY_CTX* parameters = nullptr;
-  return EVP_PKEY_get_base_id(key) == method.keyType &&
+  return value && EVP_PKEY_get_base_id(key) == method.keyType &&
          EVP_DigestVerifyInit_ex(context.get(), &parameters, method.digest, nullptr, nullptr, key,
                                  nullptr) == 1 &&
          StartPss(parameters) &&
-         EVP_DigestVerify(context.get(), AsXml(value), value.size(), AsXml(octets),
+         EVP_DigestVerify(context.get(), value->data(), value->size(), AsXml(octets),
                           octets.size()) == 1;
 }
 
@@ -290,26 +269,18 @@ std::optional<std::string> ValueOf(const std::string& octets, const Method& meth
   return method.keyType == EVP_PKEY_EC ? AsPair(value, key) : value;
 }
 
-std::string Base64Of(const std::string& value) {
-  std::string text(4 * ((value.size() + 2) / 3) + 1, '\0');
-  const int size = EVP_EncodeBlock(reinterpret_cast<unsigned char*>(text.data()), AsXml(value),
-                                   static_cast<int>(value.size()));
-  text.resize(static_cast<std::size_t>(size));
-  return text;
-}
-
 }  // namespace
 
 ReadSignature VerifyWithXmlSec(const std::string& xml, EVP_PKEY* key,
                                const std::string& signatureId) {
   ReadSignature reading;
-  const Document document = Parse(xml);
+  const XmlTree document = Parse(xml);
   xmlNode* signature = document == nullptr ? nullptr : FindSignature(document.get(), signatureId);
   xmlNode* methodElement = Find(signature, "SignatureMethod");
   if (methodElement == nullptr) {
     return reading;
   }
-  reading.signatureMethod = AttributeOf(methodElement, "Algorithm");
+  reading.signatureMethod = AlgorithmOf(methodElement);
   CollectAlgorithms(methodElement->parent, reading);
   const Method* method = FindMethod(reading.signatureMethod);
   const bool isPss = method != nullptr && method->isPss;
@@ -329,11 +300,10 @@ ReadSignature VerifyWithXmlSec(const std::string& xml, EVP_PKEY* key,
 std::string SignWithXmlSec(const std::string& xml, EVP_PKEY* key) {
   static const Tarnik::OpenSsl::OwnedKey known(
       EVP_PKEY_Q_keygen(nullptr, nullptr, "RSA", std::size_t{2048}));
-  const Document document = Parse(xml);
+  const XmlTree document = Parse(xml);
   xmlNode* signature = document == nullptr ? nullptr : Find(document->children, "Signature");
   xmlNode* methodElement = Find(signature, "SignatureMethod");
-  const Method* method =
-      FindMethod(methodElement == nullptr ? "" : AttributeOf(methodElement, "Algorithm"));
+  const Method* method = FindMethod(methodElement == nullptr ? "" : AlgorithmOf(methodElement));
   if (method == nullptr) {
     return "";
   }

@@ -2,7 +2,7 @@
 # such as "src/token=95 src/xml=95", is below its percentage, and then lists its files.
 
 # Compilers keep paths as they are given, such as /tree/build/coverage/../../src/token/principal_id.cpp.
-function normalized(path) {
+function normalised(path) {
   while (match(path, /\/[^\/.][^\/]*\/\.\.\//)) {
     path = substr(path, 1, RSTART) substr(path, RSTART + RLENGTH)
   }
@@ -20,7 +20,7 @@ BEGIN {
 }
 
 /^SF:/ {
-  file = normalized(substr($0, 4))
+  file = normalised(substr($0, 4))
   isOurs = index(file, root) == 1
   file = isOurs ? substr(file, length(root) + 1) : ""
   isOurs = file ~ /^(src|tarnik\/src)\/[^\/]+\//
