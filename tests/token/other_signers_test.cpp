@@ -1,5 +1,3 @@
-#include <fstream>
-#include <iterator>
 #include <memory>
 #include <string>
 
@@ -11,21 +9,19 @@
 #include <tarnik/xml/security/key_info_resolver.h>
 
 #include "support/assertion_text.h"
+#include "support/test_data.h"
 
-// Tokens that were signed by other implementations: README.md in the folder OTHER_SIGNERS lists
-// them.
+// Tokens that were signed by other implementations: see tarnik/tests/data/other_signers/README.md.
 namespace SsoClient::Testing {
 namespace {
 
 std::string ReadSample(const std::string& file) {
-  std::ifstream input(std::string(OTHER_SIGNERS) + "/" + file, std::ios::binary);
-  EXPECT_TRUE(input.is_open()) << file;
-  return {std::istreambuf_iterator<char>(input), std::istreambuf_iterator<char>()};
+  return Tarnik::Testing::ReadTestData("other_signers/" + file);
 }
 
 std::shared_ptr<const SamlToken> Check(const std::string& text, const std::string& signer) {
   const auto resolver = Tarnik::Xml::Security::CreateTrustedCertificatesResolver(
-      Tarnik::Crypto::LoadCertificates(std::string(OTHER_SIGNERS) + "/" + signer + ".pem"));
+      Tarnik::Crypto::CreateCertificatesFromPem(ReadSample(signer + ".pem")));
   return CreateSamlToken(text, resolver.get());
 }
 

@@ -22,9 +22,8 @@ class DistinguishedName {
   /// Reads the text of a name, its most specific part first: RFC 4514, what RFC 2253 and RFC 1779
   /// allowed (quoted values, semicolons, blanks around separators, the prefix "OID."), and what
   /// .NET writes (quotation marks that are doubled in quoted values, a reverse solidus that begins
-  /// no escape). Returns no name for any other
-  /// text, for an attribute type that is not known, and for the empty text. Never throws for a
-  /// text; the work is linear in its length.
+  /// no escape). Returns no name for any other text, for an attribute type that is not known, and
+  /// for the empty text. Never throws for a text; the work is linear in its length.
   static DistinguishedName FromText(std::string_view text);
 
   /// RFC 5280, section 7.1: types of strings, the case of ASCII letters, repeated blanks and the

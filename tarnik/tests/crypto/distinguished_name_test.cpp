@@ -66,7 +66,7 @@ std::vector<Spelling> ReadSpellings() {
   return spellings;
 }
 
-// 17 names, as written by nine programs.
+// 17 names, in nine spellings.
 class SpelledNamesTest : public testing::Test {
  protected:
   const std::vector<Ref<const Crypto::Certificate>> certificates_ =
@@ -188,9 +188,7 @@ TEST(DistinguishedNameTest, IsNoNameWhenTheSyntaxIsWrong) {
                            "OU=Login+CN=sts,,O=Example",
                            "OU=Login++CN=sts,O=Example",
                            "OU=Login+CN=sts,O=Example+",
-
                            "OU=Login+CN sts,O=Example",
-
                            "/O=Example/OU=Login+CN=sts",
                            "OU=Login+=sts,O=Example",
                            "OU=Login+C N=sts,O=Example",

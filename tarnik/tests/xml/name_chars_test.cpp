@@ -24,7 +24,8 @@ namespace {
 using namespace Tarnik::Xml;
 
 constexpr char32_t kFirst = 1;
-constexpr char32_t kLast = 0x10FFF;  // no names have characters beyond U+FFFF
+constexpr char32_t kLast = 0x10FFFF;
+constexpr char32_t kLastInNames = 0xFFFF;
 
 std::string Hex(char32_t character) {
   std::ostringstream text;
@@ -76,17 +77,19 @@ TEST(NameCharsTest, AreThoseOfTheFourthEdition) {
   for (char32_t character = kFirst; character <= kLast; ++character) {
     const bool isStart =
         character == '_' || xmlIsBaseCharQ(character) != 0 || xmlIsIdeographicQ(character) != 0;
-    ASSERT_EQ(IsNameStart(character), isStart) << Hex(character);
     const bool isOther = character == '-' || character == '.' || xmlIsDigitQ(character) != 0 ||
                          xmlIsCombiningQ(character) != 0 || xmlIsExtenderQ(character) != 0;
-    ASSERT_EQ(IsNameCharacter(character), isStart || isOther) << Hex(character);
+    // An assertion for each of a million characters would take most of the time.
+    if (IsNameStart(character) != isStart || IsNameCharacter(character) != (isStart || isOther)) {
+      FAIL() << Hex(character);
+    }
   }
 }
 
 TEST(NameCharsTest, CanAllBeReadByTheParser) {
   std::string text = "<r>";
   std::size_t count = 0;
-  for (char32_t character = kFirst; character <= kLast; ++character) {
+  for (char32_t character = kFirst; character <= kLastInNames; ++character) {
     if (IsNameStart(character)) {
       text.append("<").append(Utf8(character)).append("/>");
       ++count;
