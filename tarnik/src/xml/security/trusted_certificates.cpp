@@ -129,10 +129,12 @@ Bytes IdentityOf(const Crypto::PublicKey& key, const Certificate& certificate,
 
 /// What certificates of one key have in common. An RSA key for PSS only is another key than one of
 /// the same numbers for every scheme, and may be restricted to one hash.
-const Bytes& CommonPartOf(const Crypto::PublicKey& key, const CertificateImpl* decoded,
-                          const Bytes& identity) {
+std::string_view CommonPartOf(const Crypto::PublicKey& key, const CertificateImpl* decoded,
+                              const Bytes& identity) {
   const bool isForPssOnly = key.Algorithm() == Crypto::KeyAlgorithm::kRsaPss;
-  return isForPssOnly && decoded != nullptr ? decoded->SubjectPublicKeyInfo() : identity;
+  const Bytes& bytes =
+      isForPssOnly && decoded != nullptr ? decoded->SubjectPublicKeyInfo() : identity;
+  return {reinterpret_cast<const char*>(bytes.data()), bytes.size()};
 }
 
 Ref<const Crypto::PublicKey> KnownKeyOf(const Certificate& certificate) {
@@ -162,7 +164,7 @@ TrustedCertificates::TrustedCertificates(CertificateList certificates) {
 }
 
 void TrustedCertificates::CollectKeys() {
-  std::map<Bytes, std::size_t> places;
+  std::map<std::string_view, std::size_t> places;
   for (Trusted& trusted : list_) {
     const Ref<const Crypto::PublicKey> key = KnownKeyOf(*trusted.certificate);
     if (key == nullptr) {
