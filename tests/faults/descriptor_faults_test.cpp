@@ -1,6 +1,7 @@
 // Calls of a process that may open no further descriptor, in a forked child.
 #include <future>
 #include <string>
+#include <vector>
 
 #include <gtest/gtest.h>
 #include <sys/resource.h>
@@ -18,16 +19,22 @@ namespace {
 
 using Tarnik::Testing::HoldsInChild;
 
-/// During its lifetime this process can open only `spare` descriptors, if none is free among those
-/// that it has.
+/// During its lifetime this process can open only `spare` descriptors.
 class DescriptorShortage {
  public:
   explicit DescriptorShortage(int spare = 0) {
     getrlimit(RLIMIT_NOFILE, &before_);
-    // The lowest descriptor that is free.
+    std::vector<int> spares;
+    for (int i = 0; i < spare; ++i) {
+      spares.push_back(dup(STDERR_FILENO));
+    }
+    // The lowest descriptor that is free besides them.
     const int lowest = dup(STDERR_FILENO);
     close(lowest);
-    const rlimit shortage{static_cast<rlim_t>(lowest + spare), before_.rlim_max};
+    for (const int descriptor : spares) {
+      close(descriptor);
+    }
+    const rlimit shortage{static_cast<rlim_t>(lowest), before_.rlim_max};
     setrlimit(RLIMIT_NOFILE, &shortage);
   }
   ~DescriptorShortage() { setrlimit(RLIMIT_NOFILE, &before_); }
