@@ -92,9 +92,10 @@ TEST_P(VerificationFaultsTest, NeverSayThatAGoodTokenWasTamperedWith) {
     explained += message.find("not enough memory") == std::string::npos ? 0 : 1;
     accepted += message.empty() ? 1 : 0;
   }
-  // OpenSSL does not report each failed allocation as such, and some it can do without.
+  // OpenSSL does not report each failed allocation as such, and some it can do without: about half
+  // are reported, depending on the numbers of the key.
   EXPECT_GT(failures, 30U);
-  EXPECT_GT(explained, failures / 2);
+  EXPECT_GT(explained, failures / 3);
   EXPECT_GT(accepted, 0U);
 }
 
