@@ -1,7 +1,7 @@
 // The input determines two requests of an agent and the answers to them. What is written is exactly
 // the requests, in a form that cannot be taken for others. Each exchange ends once: with the answer
-// that the parser finds in the same bytes, or with a documented exception if there is none. Only a
-// connection that may be used again is.
+// that the parser finds in the same bytes, or with a documented exception if it finds no answer. A
+// connection is used again only if the answer allows it.
 #include <algorithm>
 #include <chrono>
 #include <limits>

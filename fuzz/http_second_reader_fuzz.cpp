@@ -74,7 +74,8 @@ int OnValue(http_parser* parser, const char* text, std::size_t size) {
   return 0;
 }
 
-// It takes a body after every status code (RFC 9112, section 6.3, rule 1) unless it is told not to.
+// Returns 1 for an answer without a body (RFC 9112, section 6.3, rule 1). Otherwise http_parser
+// reads a body after every status code.
 int OnHead(http_parser* parser) {
   SinkOf(parser).isHeadDone = true;
   SinkOf(parser).message.letsAnotherFollow = http_should_keep_alive(parser) != 0;

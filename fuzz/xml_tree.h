@@ -52,7 +52,7 @@ std::vector<XmlAttribute> AttributesOf(const xmlNode* element);
 /// The value of the attribute with this name, as written; none if it is absent.
 std::optional<std::string> AttributeOf(const xmlNode* element, const std::string& name);
 
-/// The first child element with this local name; null if there is none, or no element.
+/// The first child element with this local name. Null if no child has it, or if `element` is null.
 const xmlNode* ChildElement(const xmlNode* element, const std::string& localName);
 
 /// The namespace to which a prefix, "" for none, is bound at the element; none if it is unbound.

@@ -23,7 +23,7 @@ struct KeySelection {
 };
 
 /// The keys that `resolver` trusts for `keyInfo` and that can verify signatures of `scheme`. Throws
-/// `XmlSecurityException` when there is none; exceptions of the resolver pass through.
+/// `XmlSecurityException` when no key qualifies. Exceptions of the resolver pass through.
 KeySelection SelectKeys(const KeyInfoResolver& resolver, const KeyInfo& keyInfo,
                         Crypto::SignatureScheme scheme);
 

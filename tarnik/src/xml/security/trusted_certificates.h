@@ -31,8 +31,8 @@ class TrustedCertificates {
   /// present, in the order of the list: see `CreateTrustedCertificatesResolver`. Throws
   /// `CryptoException` when it names a single certificate whose key cannot be used.
   Keys NamedBy(const KeyInfo& keyInfo) const;
-  /// As above, but by the issuer and serial number only; if there is none, by those of the first
-  /// certificate in `keyInfo`.
+  /// As above, but only by issuer and serial number. If `keyInfo` has no such hint, uses those of
+  /// its first certificate.
   Keys NamedByIssuer(const KeyInfo& keyInfo) const;
 
  private:
