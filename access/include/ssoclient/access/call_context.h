@@ -2,6 +2,7 @@
 #define SSOCLIENT_ACCESS_CALL_CONTEXT_H
 
 #include <chrono>
+#include <cstdint>
 #include <functional>
 #include <memory>
 
@@ -9,20 +10,23 @@
 
 namespace SsoClient::Access {
 
-/// Keeps a function registered with a `CancellationToken`. Movable. Its destructor removes the
-/// function; when the function is running on another thread, it waits until that has returned.
+class CancellationState;
+
+/// Keeps a function registered with a `CancellationToken`. Its destructor removes the function; if
+/// the function is running on another thread, the destructor waits until it has returned.
 class SSOCLIENT_ACCESS_EXPORT CancellationRegistration {
  public:
-  CancellationRegistration() noexcept;
+  CancellationRegistration() noexcept = default;
   CancellationRegistration(CancellationRegistration&& other) noexcept;
   CancellationRegistration& operator=(CancellationRegistration&& other) noexcept;
   ~CancellationRegistration();
 
  private:
   friend class CancellationToken;
-  class State;
-  explicit CancellationRegistration(std::unique_ptr<State> state) noexcept;
-  std::unique_ptr<State> state_;
+  CancellationRegistration(std::shared_ptr<CancellationState> state, std::uint64_t id) noexcept;
+
+  std::shared_ptr<CancellationState> state_;
+  std::uint64_t id_ = 0;
 };
 
 /// Reports that the caller has given up. A copy refers to the same `CancellationSource`, which may
@@ -34,27 +38,27 @@ class SSOCLIENT_ACCESS_EXPORT CancellationToken {
   bool IsCancelled() const noexcept;
   /// False for a default-constructed token.
   bool CanBeCancelled() const noexcept { return state_ != nullptr; }
-  /// Runs `action` once when the token is cancelled, on the thread that cancels it; immediately,
-  /// in this call, when it already is. `action` must not throw or block. The registration must be
-  /// kept for as long as `action` is to run. Throws `Tarnik::InvalidArgumentException` when
-  /// `action` is empty.
+  /// Runs `action` once when the token is cancelled, on the thread that cancels it, or in this call
+  /// if it already is. `action` runs for as long as the registration exists; it must not throw or
+  /// block. Throws `Tarnik::InvalidArgumentException` when `action` is empty.
   [[nodiscard]] CancellationRegistration OnCancel(std::function<void()> action) const;
 
  private:
   friend class CancellationSource;
-  class State;
-  explicit CancellationToken(std::shared_ptr<State> state) noexcept;
-  std::shared_ptr<State> state_;
+  explicit CancellationToken(std::shared_ptr<CancellationState> state) noexcept;
+
+  std::shared_ptr<CancellationState> state_;
 };
 
-/// Cancels the calls that were made with its token. Thread-safe.
+/// Cancels the calls that were made with its token. Copies share one state. Thread-safe.
 class SSOCLIENT_ACCESS_EXPORT CancellationSource {
  public:
   CancellationSource();
 
   CancellationToken Token() const noexcept { return token_; }
-  /// Cancels the calls under way, which end with `Tarnik::CancelledException`, as do those made
-  /// later. Runs the registered functions before it returns. May be called any number of times.
+  /// Ends the calls under way with `Tarnik::CancelledException`, and those that are made later. The
+  /// registered functions have run when the first call of `Cancel` returns. May be called any
+  /// number of times.
   void Cancel() const noexcept;
 
  private:

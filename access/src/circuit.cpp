@@ -1,0 +1,43 @@
+#include "circuit.h"
+
+#include "backoff.h"
+
+namespace SsoClient::Access {
+
+bool Circuit::Admit(Instant::Steady now) {
+  if (state_ == CircuitState::kClosed) {
+    return now >= retryAt_;
+  }
+  if (state_ == CircuitState::kHalfOpen || now < retryAt_) {
+    return false;
+  }
+  state_ = CircuitState::kHalfOpen;
+  return true;
+}
+
+void Circuit::OnAnswer() {
+  state_ = CircuitState::kClosed;
+  failures_ = 0;
+  retryAt_ = Instant::Steady::min();
+}
+
+void Circuit::OnFailure(Instant::Steady now, std::chrono::milliseconds retryAfter, double draw) {
+  ++failures_;
+  const bool opens = state_ == CircuitState::kHalfOpen || failures_ >= config_.failuresToOpen;
+  if (opens) {
+    state_ = CircuitState::kOpen;
+    retryAt_ = now + Backoff(config_, failures_, retryAfter, draw);
+    return;
+  }
+  if (retryAfter > std::chrono::milliseconds(0)) {
+    retryAt_ = now + Backoff(config_, failures_, retryAfter, draw);
+  }
+}
+
+void Circuit::OnAbandoned() {
+  if (state_ == CircuitState::kHalfOpen) {
+    state_ = CircuitState::kOpen;
+  }
+}
+
+}  // namespace SsoClient::Access
