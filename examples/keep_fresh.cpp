@@ -24,7 +24,7 @@ int main(int argc, char** argv) {
     config.sslContext = Tarnik::Ssl::CreateSSLContext(tls);
     config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
     for (int i = 5; i < argc; ++i) {
-      config.endpoints.push_back({argv[i], ""});
+      config.endpoints.push_back({argv[i]});
     }
     config.login = SsoClient::Access::PasswordLogin{argv[3], [file = std::string(argv[4])] {
                                                       std::string password;
@@ -38,13 +38,17 @@ int main(int argc, char** argv) {
     spec.tokenLifetimeSec = 3600;
     spec.audienceRestriction = {"https://orders.example.com"};
     while (true) {
-      const auto context = SsoClient::Access::CallContext::Within(std::chrono::seconds(2));
-      const auto token = source->GetToken(spec, context);
-      std::cout << "valid until " << token->ExpirationTime().GetUtcTime() << '\n';
+      try {
+        const auto context = SsoClient::Access::CallContext::Within(std::chrono::seconds(2));
+        const auto token = source->GetToken(spec, context);
+        std::cout << "valid until " << token->ExpirationTime().ToString() << std::endl;
+      } catch (const Tarnik::Exception& e) {
+        std::cerr << "no token now: " << e.what() << '\n';
+      }
       std::this_thread::sleep_for(std::chrono::seconds(1));
     }
   } catch (const std::exception& e) {
-    std::cerr << "No token: " << e.what() << '\n';
+    std::cerr << "Cannot start: " << e.what() << '\n';
   }
   return 1;
 }

@@ -34,7 +34,7 @@ FailureKind ClassifyExchange(const Tarnik::IOException& failure) noexcept {
     return FailureKind::kTimedOut;
   }
   if (Is<Tarnik::CancelledException>(failure)) {
-    return FailureKind::kCancelled;
+    return FailureKind::kAbandoned;
   }
   if (Is<Tarnik::Ssl::SSLException>(failure)) {
     return FailureKind::kTls;
@@ -59,8 +59,8 @@ const char* NameOf(FailureKind kind) noexcept {
       return "tls";
     case FailureKind::kTimedOut:
       return "timed-out";
-    case FailureKind::kCancelled:
-      return "cancelled";
+    case FailureKind::kCutOff:
+      return "cut-off";
     case FailureKind::kHttpStatus:
       return "http-status";
     case FailureKind::kBadAnswer:
@@ -73,6 +73,10 @@ const char* NameOf(FailureKind kind) noexcept {
       return "expired-password";
     case FailureKind::kBadToken:
       return "bad-token";
+    case FailureKind::kSecretFailed:
+      return "secret-failed";
+    case FailureKind::kAbandoned:
+      return "abandoned";
     case FailureKind::kLocal:
       return "local";
   }
@@ -91,6 +95,21 @@ FailureKind Classify(const Tarnik::Exception& failure) noexcept {
       Is<Tarnik::Crypto::CryptoException>(failure) ||
       Is<Tarnik::Xml::Security::XmlSecurityException>(failure);
   return isToken ? FailureKind::kBadToken : FailureKind::kLocal;
+}
+
+bool AllowsFailover(FailureKind kind) noexcept {
+  switch (kind) {
+    case FailureKind::kUnreachable:
+    case FailureKind::kTlsTrust:
+    case FailureKind::kTlsName:
+    case FailureKind::kTls:
+    case FailureKind::kTimedOut:
+    case FailureKind::kCutOff:
+    case FailureKind::kHttpStatus:
+      return true;
+    default:
+      return false;
+  }
 }
 
 }  // namespace SsoClient::Access

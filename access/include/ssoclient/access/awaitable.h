@@ -7,36 +7,59 @@
 
 #include <coroutine>
 #include <memory>
+#include <new>
 #include <utility>
 
 #include <ssoclient/access/token_source.h>
 
 namespace SsoClient::Access {
 
-/// What `AwaitToken` returns: `co_await` it once.
+/// What `AwaitToken` returns. Can be awaited once, as a temporary.
 class TokenAwaitable {
  public:
-  TokenAwaitable(TokenSource& source, TokenSpec spec, CallContext context)
-      : source_(&source), spec_(std::move(spec)), context_(std::move(context)) {}
-  TokenAwaitable(const TokenAwaitable&) = delete;
-  TokenAwaitable& operator=(const TokenAwaitable&) = delete;
+  class Awaiter;
 
-  bool await_ready() const noexcept { return false; }
+  TokenAwaitable(std::shared_ptr<TokenSource> source, TokenSpec spec, CallContext context)
+      : source_(std::move(source)), spec_(std::move(spec)), context_(std::move(context)) {}
+
+  Awaiter operator co_await() &&;
+
+ private:
+  std::shared_ptr<TokenSource> source_;
+  TokenSpec spec_;
+  CallContext context_;
+};
+
+class TokenAwaitable::Awaiter {
+ public:
+  Awaiter(std::shared_ptr<TokenSource> source, TokenSpec spec, CallContext context)
+      : source_(std::move(source)), spec_(std::move(spec)), context_(std::move(context)) {}
+  Awaiter(const Awaiter&) = delete;
+  Awaiter& operator=(const Awaiter&) = delete;
+
+  bool await_ready() {
+    if (context_.minimumLife == std::chrono::seconds(0)) {
+      token_ = source_->TryGetToken(spec_);
+    }
+    return token_ != nullptr;
+  }
   void await_suspend(std::coroutine_handle<> caller) {
     // The coroutine, and with it this object, may end before the call returns.
+    const auto source = source_;
     const TokenSpec spec = std::move(spec_);
     const CallContext context = std::move(context_);
-    source_->GetTokenAsync(spec, context,
-                           [this, caller](const std::shared_ptr<const SamlToken>& token,
-                                          const Tarnik::Exception* failure) {
-                             token_ = token;
-                             if (failure != nullptr) {
-                               failure_ = failure->Clone();
-                             }
-                             caller.resume();
-                           });
+    source->GetTokenAsync(spec, context,
+                          [this, caller](const std::shared_ptr<const SamlToken>& token,
+                                         const Tarnik::Exception* failure) {
+                            token_ = token;
+                            Keep(failure);
+                            caller.resume();
+                          });
   }
   std::shared_ptr<const SamlToken> await_resume() {
+    if (hasNoMemory_) {
+      Tarnik::OutOfMemory().Throw();
+    }
     if (failure_ != nullptr) {
       failure_->Throw();
     }
@@ -44,22 +67,39 @@ class TokenAwaitable {
   }
 
  private:
-  TokenSource* source_;
+  void Keep(const Tarnik::Exception* failure) noexcept {
+    if (failure == nullptr) {
+      return;
+    }
+    try {
+      failure_ = failure->Clone();
+    } catch (const std::bad_alloc&) {
+      hasNoMemory_ = true;
+    }
+  }
+
+  std::shared_ptr<TokenSource> source_;
   TokenSpec spec_;
   CallContext context_;
   std::shared_ptr<const SamlToken> token_;
   std::unique_ptr<Tarnik::Throwable> failure_;
+  bool hasNoMemory_ = false;
 };
+
+inline TokenAwaitable::Awaiter TokenAwaitable::operator co_await() && {
+  return Awaiter(std::move(source_), std::move(spec_), std::move(context_));
+}
 
 /// Returns a token as `TokenSource::GetToken` does, or throws what that throws, in a coroutine:
 ///
-///     const auto token = co_await AwaitToken(*source, spec);
+///     const auto token = co_await AwaitToken(source, spec);
 ///
-/// The coroutine continues on a worker thread of the platform's pool, where it may block; an
-/// exception that leaves it there ends the process. `source` must exist until then.
-[[nodiscard]] inline TokenAwaitable AwaitToken(TokenSource& source, TokenSpec spec,
+/// If the token is in the cache, the coroutine does not suspend. Otherwise it continues on a worker
+/// thread of the platform's pool, where it may block; an exception that leaves it there ends the
+/// process.
+[[nodiscard]] inline TokenAwaitable AwaitToken(std::shared_ptr<TokenSource> source, TokenSpec spec,
                                                CallContext context = {}) {
-  return TokenAwaitable(source, std::move(spec), std::move(context));
+  return TokenAwaitable(std::move(source), std::move(spec), std::move(context));
 }
 
 }  // namespace SsoClient::Access

@@ -13,7 +13,8 @@ namespace SsoClient::Access {
 class CancellationState;
 
 /// Keeps a function registered with a `CancellationToken`. Its destructor removes the function; if
-/// the function is running on another thread, the destructor waits until it has returned.
+/// the function is running on another thread, the destructor waits until it has returned, so the
+/// caller must not hold a lock that the function needs.
 class SSOCLIENT_ACCESS_EXPORT CancellationRegistration {
  public:
   CancellationRegistration() noexcept = default;
@@ -39,7 +40,7 @@ class SSOCLIENT_ACCESS_EXPORT CancellationToken {
   /// False for a default-constructed token.
   bool CanBeCancelled() const noexcept { return state_ != nullptr; }
   /// Runs `action` once when the token is cancelled, on the thread that cancels it, or in this call
-  /// if it already is. `action` runs for as long as the registration exists; it must not throw or
+  /// if it already is; never after the registration has been destroyed. `action` must not throw or
   /// block. Throws `Tarnik::InvalidArgumentException` when `action` is empty.
   [[nodiscard]] CancellationRegistration OnCancel(std::function<void()> action) const;
 
@@ -70,21 +71,27 @@ class SSOCLIENT_ACCESS_EXPORT CancellationSource {
 struct CallContext {
   using Clock = std::chrono::steady_clock;
 
-  /// The call ends at this time at the latest, with a `CommunicationException` that says what it
-  /// was waiting for. The default is no limit of the caller's own; an exchange with the service
-  /// still has its limit of 240 seconds.
+  /// When the call ends at the latest, with a `CommunicationException` that says what it was
+  /// waiting for. A call without a deadline of its own ends when its attempts have failed
+  /// (`RetryConfig`).
   Clock::time_point deadline = Clock::time_point::max();
   /// Ends the call earlier, with `Tarnik::CancelledException`.
-  CancellationToken cancellation;
+  CancellationToken cancellation{};
+  /// The token must be valid for at least this long; zero means the source's own margin
+  /// (`RefreshConfig::longestMargin`).
+  std::chrono::seconds minimumLife{0};
 
-  /// A context whose deadline is `duration` from now. A duration that is too long for the clock
-  /// means no deadline.
-  static CallContext Within(std::chrono::milliseconds duration) {
-    CallContext context;
+  /// A context whose deadline is `duration` from now; negative durations count as zero, and those
+  /// that are too long for the clock as no deadline.
+  template <class Rep, class Period>
+  static CallContext Within(std::chrono::duration<Rep, Period> duration) {
+    using Seconds = std::chrono::duration<double>;
     const auto now = Clock::now();
-    if (duration <
-        std::chrono::duration_cast<std::chrono::milliseconds>(Clock::time_point::max() - now)) {
-      context.deadline = now + duration;
+    CallContext context;
+    if (Seconds(duration) <= Seconds::zero()) {
+      context.deadline = now;
+    } else if (Seconds(duration) < Seconds(Clock::time_point::max() - now) / 2) {
+      context.deadline = now + std::chrono::duration_cast<Clock::duration>(duration);
     }
     return context;
   }

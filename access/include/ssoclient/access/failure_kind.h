@@ -9,19 +9,21 @@ namespace SsoClient::Access {
 /// Why an attempt to get a token failed, for programs. Kinds may be added in later versions.
 enum class FailureKind {
   kNone,             ///< it did not fail
-  kUnreachable,      ///< no address for the host, connection refused, reset, or no route
+  kUnreachable,      ///< no address for the host, connection refused or reset, or no route
   kTlsTrust,         ///< the service's certificate is not trusted, expired or revoked
   kTlsName,          ///< the service's certificate is for another name
   kTls,              ///< any other failure of TLS
-  kTimedOut,         ///< a limit of the exchange or the caller's deadline passed
-  kCancelled,        ///< the caller, or `Stop`, ended it
+  kTimedOut,         ///< the endpoint did not answer within the limit of an attempt
+  kCutOff,           ///< the connection ended before the answer did
   kHttpStatus,       ///< an HTTP status other than 2xx, without a SOAP fault
-  kBadAnswer,        ///< an answer that violates HTTP or is not the one that WS-Trust specifies
+  kBadAnswer,        ///< an answer that violates HTTP or is not what WS-Trust specifies
   kFault,            ///< a SOAP fault, except a refused login
   kRefusedLogin,     ///< the service refused the credentials
   kExpiredPassword,  ///< the service refused the password because it has expired
   kBadToken,         ///< the service issued a token that was not accepted
-  kLocal,            ///< a failure on this side: an argument, a key, threads or memory
+  kSecretFailed,     ///< a function of the login threw, before anything was sent
+  kAbandoned,        ///< nobody waited for it any longer: deadlines, cancellation or `Stop`
+  kLocal,            ///< another failure on this side: an argument, a key, threads or memory
 };
 
 /// The name of the kind in lower case with hyphens, such as "refused-login"; valid for the
@@ -34,9 +36,8 @@ SSOCLIENT_ACCESS_EXPORT const char* NameOf(FailureKind kind) noexcept;
 SSOCLIENT_ACCESS_EXPORT FailureKind Classify(const Tarnik::Exception& failure) noexcept;
 
 /// True for the failures that no service has decided, after which the next endpoint is asked:
-/// `kUnreachable`, `kTlsTrust`, `kTlsName`, `kTls`, `kTimedOut`, `kHttpStatus`, and `kBadAnswer`
-/// when the answer was cut off or was not HTTP.
-SSOCLIENT_ACCESS_EXPORT bool IsUndecided(FailureKind kind) noexcept;
+/// `kUnreachable`, `kTlsTrust`, `kTlsName`, `kTls`, `kTimedOut`, `kCutOff` and `kHttpStatus`.
+SSOCLIENT_ACCESS_EXPORT bool AllowsFailover(FailureKind kind) noexcept;
 
 }  // namespace SsoClient::Access
 

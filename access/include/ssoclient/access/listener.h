@@ -6,20 +6,26 @@
 #include <memory>
 #include <string>
 
+#include <boost/optional.hpp>
+
 #include <ssoclient/access/export.h>
 #include <ssoclient/access/failure_kind.h>
+#include <tarnik/system/date_time.h>
 
 namespace SsoClient::Access {
 
 /// What an attempt asks the service for.
 enum class AttemptOperation { kLogin, kRenewal, kExchange };
 
-/// One request, or one negotiation, to one endpoint.
+/// One request, or one negotiation, at one endpoint.
 struct AttemptRecord {
+  std::string source;    ///< `TokenSourceConfig::name`
+  std::uint64_t id = 0;  ///< the same when it begins and when it ends; unique in the source
   std::string endpoint;  ///< the URL as configured
   AttemptOperation operation = AttemptOperation::kLogin;
-  bool isRefresh = false;  ///< begun in the background, for a key that has a valid token
-  /// The following are set when the attempt has ended.
+  bool isRefresh = false;  ///< begun in the background, for a key that has a usable token
+  int number = 1;          ///< 1 for the first attempt of a request, 2 for the second
+  /// The rest is set when the attempt has ended.
   std::chrono::microseconds duration{0};
   FailureKind failure = FailureKind::kNone;
   std::string message;  ///< of the failure; empty without one
@@ -28,56 +34,58 @@ struct AttemptRecord {
 
 enum class CircuitState { kClosed, kOpen, kHalfOpen };
 
+/// An endpoint's circuit has changed.
 struct CircuitRecord {
+  std::string source;
   std::string endpoint;
   CircuitState state = CircuitState::kClosed;
-  /// For an open circuit, when the endpoint is tried again.
-  std::chrono::milliseconds retryAfter{0};
+  std::chrono::milliseconds retryAfter{0};  ///< for an open circuit, until the next probe
 };
 
-/// An answer whose `Date` differs from this system's clock by more than 30 seconds.
+/// The `Date` of an endpoint's answers began, or ceased, to differ from this system's clock by more
+/// than 30 seconds.
 struct ClockRecord {
+  std::string source;
   std::string endpoint;
-  /// The service's clock minus this system's.
-  std::chrono::milliseconds offset{0};
+  std::chrono::milliseconds offset{0};  ///< the service's clock minus this system's
 };
 
 /// A field of an issued token that is not what the request asked for. The token is handed out
-/// nevertheless, as the client does; a listener may be stricter.
+/// nevertheless, as the client does.
 struct DeviationRecord {
+  std::string source;
   std::string endpoint;
-  std::string field;      ///< "subject", "audiences", "lifetime", "confirmation", "delegable", ...
+  std::string field;      ///< "subject", "audiences", "lifetime", "confirmation" or "delegable"
   std::string requested;  ///< as text
   std::string issued;     ///< as text
 };
 
-enum class CacheEvent {
-  kHit,      ///< a token was in the cache, with enough life left
-  kMiss,     ///< there was none, so that one was requested
-  kShared,   ///< there was none, and another caller's request is under way
-  kStale,    ///< a refresh has failed, and the last token was served
-  kRefused,  ///< a login that was refused earlier was answered from memory
-  kDropped,  ///< a key was dropped instead of refreshed, or evicted for lack of space
+/// A refresh has failed, and the last token is served until it is no longer usable.
+struct RefreshFailureRecord {
+  std::string source;
+  FailureKind failure = FailureKind::kNone;
+  std::string message;
+  Tarnik::System::DateTime usableUntil;
+  std::chrono::milliseconds nextAttempt{0};  ///< from now
 };
 
 /// Sees what a token source does. Records never contain a password, a key, or the text of a token.
-/// All functions do nothing unless they are overridden. They run on the threads that do the work,
-/// possibly several at once, must be thread-safe, should return quickly, and must not throw or call
-/// the source. Functions may be added at the end in later versions.
+/// The functions do nothing unless they are overridden. They run on worker threads of the platform,
+/// several at once, should return quickly, and must not throw or call the source. Later versions
+/// add no functions here, but may add an interface that is derived from this one.
 class SSOCLIENT_ACCESS_EXPORT AccessListener {
  public:
   virtual ~AccessListener();
   virtual void OnAttemptBegun(const AttemptRecord& attempt);
   virtual void OnAttemptEnded(const AttemptRecord& attempt);
-  /// For `kHit`, on the thread of the caller: keep it short.
-  virtual void OnCache(CacheEvent event);
+  virtual void OnRefreshFailed(const RefreshFailureRecord& refresh);
   virtual void OnCircuit(const CircuitRecord& circuit);
   virtual void OnClock(const ClockRecord& clock);
   virtual void OnDeviation(const DeviationRecord& deviation);
 };
 
-/// Writes a line to the library's log for each record except cache hits: failures at level 3,
-/// circuits, clocks and deviations at level 4, the others at level 6.
+/// Writes a line to the log of the platform for each record: failures at level 3, refused logins at
+/// level 2, circuits, clocks and deviations at level 4, other attempts at level 6.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<AccessListener> CreateLogListener();
 
 }  // namespace SsoClient::Access

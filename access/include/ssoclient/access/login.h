@@ -6,6 +6,7 @@
 #include <string>
 #include <variant>
 
+#include <ssoclient/access/endpoint.h>
 #include <ssoclient/negotiation_handler.h>
 #include <ssoclient/token_spec.h>
 
@@ -15,39 +16,39 @@ class TokenSource;
 
 /// Logs in with a user name and a password.
 struct PasswordLogin {
-  std::string userName;
-  /// Returns the password. Called on a worker thread for each login, so that a changed file or
-  /// vault takes effect with the next one; it may block, but a deadline does not interrupt it. Its
-  /// result is cleansed from memory after use. An exception that it throws ends the calls that wait
-  /// for the login, unchanged if it is a `Tarnik::Exception`; nothing is remembered or sent. An
-  /// empty password causes `Tarnik::InvalidArgumentException`. Must not be empty.
-  std::function<std::string()> password;
+  std::string userName{};
+  /// Returns the password, which must not be empty; its text is cleansed from memory after use.
+  /// Called on a worker thread before each login, so that a changed file or vault takes effect at
+  /// once. It may block: callers still end at their deadlines, and its result is then dropped. An
+  /// exception that it throws reaches the callers that wait for the login, and nothing is sent or
+  /// remembered. Must be set.
+  std::function<std::string()> password{};
 };
 
-/// Logs in as the owner of the holder-of-key certificate.
+/// Logs in as the owner of the holder-of-key certificate, which the source must have. The specs
+/// must have `CONFIRMATION_DEFAULT`.
 struct CertificateLogin {};
 
 /// Logs in by a negotiation such as Kerberos.
 struct NegotiatedLogin {
-  /// Returns a new handler. Called on a worker thread for each login and each endpoint that is
-  /// tried, with the host of that endpoint; throws as `PasswordLogin::password` may. With the
-  /// Kerberos handler:
+  /// Returns a new handler, never null. Called on a worker thread for each login at each endpoint;
+  /// may block and throw as `PasswordLogin::password` may. Must be set. With the handler of
+  /// `ssoclient/gssapi_negotiation_handler.h`:
   ///
-  ///     NegotiatedLogin{[](const std::string& host) {
-  ///       return SsoClient::CreateGssapiNegotiationHandler({"HTTP@" + host});
+  ///     NegotiatedLogin{[](const Endpoint&) {
+  ///       return SsoClient::CreateGssapiNegotiationHandler({"HTTP@sts.example.com", "", "", ""});
   ///     }}
-  ///
-  /// Must not be empty and must not return null.
-  std::function<std::shared_ptr<NegotiationHandler>(const std::string& host)> createHandler;
+  std::function<std::shared_ptr<NegotiationHandler>(const Endpoint& endpoint)> createHandler{};
 };
 
 /// Exchanges the token of another source, which must be bound to the holder-of-key configuration of
 /// this source. The spec of each call says what for: other audiences, a delegate, or on behalf of
-/// the subject of its act-as token.
+/// the subject of its act-as token, whose result is never refreshed past the end of that token.
 struct TokenLogin {
-  std::shared_ptr<TokenSource> source;
-  /// What to ask that source for.
-  TokenSpec spec;
+  /// Must not be null, and must not depend on this source.
+  std::shared_ptr<TokenSource> source{};
+  /// What to ask `source` for.
+  TokenSpec spec{};
 };
 
 using Login = std::variant<PasswordLogin, CertificateLogin, NegotiatedLogin, TokenLogin>;
