@@ -28,6 +28,16 @@ FailureKind ClassifyClient(const SsoException& failure) noexcept {
   return Is<InvalidTokenException>(failure) ? FailureKind::kBadToken : FailureKind::kFault;
 }
 
+FailureKind ClassifyTls(const Tarnik::IOException& failure) noexcept {
+  if (Is<Tarnik::Ssl::PeerTrustException>(failure)) {
+    return FailureKind::kTlsTrust;
+  }
+  if (Is<Tarnik::Ssl::PeerNameException>(failure)) {
+    return FailureKind::kTlsName;
+  }
+  return Is<Tarnik::Ssl::TruncationException>(failure) ? FailureKind::kCutOff : FailureKind::kTls;
+}
+
 FailureKind ClassifyExchange(const Tarnik::IOException& failure) noexcept {
   if (Is<Tarnik::TimeoutException>(failure)) {
     return FailureKind::kTimedOut;
@@ -36,7 +46,10 @@ FailureKind ClassifyExchange(const Tarnik::IOException& failure) noexcept {
     return FailureKind::kAbandoned;
   }
   if (Is<Tarnik::Ssl::SSLException>(failure)) {
-    return FailureKind::kTls;
+    return ClassifyTls(failure);
+  }
+  if (Is<Tarnik::Http::CutOffException>(failure)) {
+    return FailureKind::kCutOff;
   }
   return Is<Tarnik::Http::HttpException>(failure) ? FailureKind::kBadAnswer
                                                   : FailureKind::kUnreachable;
