@@ -28,12 +28,10 @@ TokenLife PlanTokenLife(const RefreshConfig& config, const GrantedPeriod& period
   const microseconds margin =
       std::min(lifetime / kMarginDivisor, microseconds(config.longestMargin));
   const microseconds usable = lifetime - margin;
-  const double fraction =
-      std::clamp(config.fraction + config.jitter * (2 * draw - 1), 0.0, 1.0);
-  const auto refreshAfter =
-      microseconds(static_cast<microseconds::rep>(fraction * static_cast<double>(lifetime.count())));
-  return {now.steady + std::min(refreshAfter, usable),
-          {now.steady + usable, now.wall + usable}};
+  const double fraction = std::clamp(config.fraction + config.jitter * (2 * draw - 1), 0.0, 1.0);
+  const auto refreshAfter = microseconds(
+      static_cast<microseconds::rep>(fraction * static_cast<double>(lifetime.count())));
+  return {now.steady + std::min(refreshAfter, usable), {now.steady + usable, now.wall + usable}};
 }
 
 }  // namespace SsoClient::Access

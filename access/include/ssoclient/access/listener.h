@@ -28,8 +28,10 @@ struct AttemptRecord {
   /// The rest is set when the attempt has ended.
   std::chrono::microseconds duration{0};
   FailureKind failure = FailureKind::kNone;
-  std::string message;  ///< of the failure; empty without one
-  int httpStatus = 0;   ///< of the last answer; 0 without an answer
+  /// Of the failure, without control characters and without the password, and at most 1000 bytes
+  /// long; empty without a failure.
+  std::string message;
+  int httpStatus = 0;  ///< of the last answer; 0 without an answer
 };
 
 enum class CircuitState { kClosed, kOpen, kHalfOpen };
@@ -51,11 +53,20 @@ struct ClockRecord {
 };
 
 /// A field of an issued token that is not what the request asked for. The token is handed out
-/// nevertheless, as the client does.
+/// nevertheless, as the client does. Compared are
+///  - "subject": with a user name of the form "name@domain", the subject of the token to renew or
+///  to
+///    exchange, or that of the act-as token;
+///  - "audiences": as sets;
+///  - "lifetime": from the answer to the end, by the service's clock, if it differs by more than
+///  two
+///    seconds, a hundredth and the duration of the exchange;
+///  - "confirmation": bearer or holder-of-key, and the key;
+///  - "delegable" and "renewable".
 struct DeviationRecord {
   std::string source;
   std::string endpoint;
-  std::string field;      ///< "subject", "audiences", "lifetime", "confirmation" or "delegable"
+  std::string field;      ///< as listed above
   std::string requested;  ///< as text
   std::string issued;     ///< as text
 };
