@@ -112,10 +112,11 @@ std::exception_ptr Explain(const std::exception_ptr& exception, const Tarnik::Ex
     return std::make_exception_ptr(
         SsoException(failure.Message() + DescribeClocks(*seen.clock), failure.Where()));
   }
-  const auto* cause = dynamic_cast<const Tarnik::TimeoutException*>(seen.failure.get());
-  if (kind == FailureKind::kTimedOut && cause != nullptr) {
+  if (kind == FailureKind::kTimedOut) {
     // Without the words about a deadline of the caller, since it is that of the attempt.
-    return std::make_exception_ptr(CommunicationException(cause->Message(), failure.Where()));
+    const auto* cause = dynamic_cast<const Tarnik::TimeoutException*>(seen.failure.get());
+    return std::make_exception_ptr(CommunicationException(
+        cause == nullptr ? "The time of the attempt is over." : cause->Message(), failure.Where()));
   }
   return exception;
 }

@@ -190,8 +190,9 @@ TEST_F(AttemptFailureTest, AServiceThatDropsConnectionsTimesOut) {
 }
 
 TEST_F(AttemptFailureTest, AnAttemptAfterItsLimitTimesOut) {
-  ExpectFailure<CommunicationException>(AttemptWithin(-1ms, Sts().HttpUrl()),
-                                        FailureKind::kTimedOut);
+  EXPECT_EQ(ExpectFailure<CommunicationException>(AttemptWithin(-1ms, Sts().HttpUrl()),
+                                                  FailureKind::kTimedOut),
+            "The time of the attempt is over.");
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
