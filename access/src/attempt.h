@@ -2,8 +2,10 @@
 #define SSOCLIENT_ACCESS_ATTEMPT_H
 
 #include <chrono>
+#include <exception>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include <boost/optional.hpp>
 
@@ -36,6 +38,8 @@ struct AttemptOutcome {
   std::chrono::milliseconds retryAfter{0};
   /// The service's clock minus this system's, from the `Date` of the last answer.
   boost::optional<std::chrono::milliseconds> clockOffset;
+  /// What differs between the token and the spec; `source` and `endpoint` are left empty.
+  std::vector<DeviationRecord> deviations;
 };
 
 /// Makes attempts at one endpoint. Thread-safe.
@@ -46,8 +50,7 @@ class EndpointClient {
   virtual const Endpoint& Where() const = 0;
   /// Blocks until the attempt has ended, at the latest at the deadline of `limit` or when it is
   /// cancelled. Does not throw, except `std::bad_alloc`.
-  virtual AttemptOutcome Attempt(const AttemptRequest& request,
-                                 Tarnik::Http::CallLimit& limit) = 0;
+  virtual AttemptOutcome Attempt(const AttemptRequest& request, Tarnik::Http::CallLimit& limit) = 0;
 };
 
 /// A client of `endpoint` over the client library, with kept connections. Throws

@@ -1,5 +1,3 @@
-#include <ssoclient/access/call_context.h>
-
 #include <atomic>
 #include <condition_variable>
 #include <map>
@@ -7,6 +5,7 @@
 #include <thread>
 #include <utility>
 
+#include <ssoclient/access/call_context.h>
 #include <tarnik/core/exception.h>
 
 namespace SsoClient::Access {

@@ -5,13 +5,12 @@
 namespace SsoClient::Access {
 
 bool Circuit::Admit(Instant::Steady now) {
-  if (state_ == CircuitState::kClosed) {
-    return now >= retryAt_;
-  }
-  if (state_ == CircuitState::kHalfOpen || now < retryAt_) {
+  if (!CanAdmit(now)) {
     return false;
   }
-  state_ = CircuitState::kHalfOpen;
+  if (state_ == CircuitState::kOpen) {
+    state_ = CircuitState::kHalfOpen;
+  }
   return true;
 }
 

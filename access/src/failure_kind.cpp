@@ -1,5 +1,4 @@
 #include <ssoclient/access/failure_kind.h>
-
 #include <ssoclient/exceptions.h>
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/http/http_exception.h>
@@ -90,10 +89,10 @@ FailureKind Classify(const Tarnik::Exception& failure) noexcept {
   if (const auto* exchange = dynamic_cast<const Tarnik::IOException*>(&failure)) {
     return ClassifyExchange(*exchange);
   }
-  const bool isToken =
-      Is<Tarnik::Xml::XMLParseException>(failure) || Is<Tarnik::Base64FormatException>(failure) ||
-      Is<Tarnik::Crypto::CryptoException>(failure) ||
-      Is<Tarnik::Xml::Security::XmlSecurityException>(failure);
+  const bool isToken = Is<Tarnik::Xml::XMLParseException>(failure) ||
+                       Is<Tarnik::Base64FormatException>(failure) ||
+                       Is<Tarnik::Crypto::CryptoException>(failure) ||
+                       Is<Tarnik::Xml::Security::XmlSecurityException>(failure);
   return isToken ? FailureKind::kBadToken : FailureKind::kLocal;
 }
 

@@ -14,7 +14,9 @@ struct Instant {
   Steady steady;
   Wall wall;
 
-  static Instant Now() { return {std::chrono::steady_clock::now(), std::chrono::system_clock::now()}; }
+  static Instant Now() {
+    return {std::chrono::steady_clock::now(), std::chrono::system_clock::now()};
+  }
 };
 
 }  // namespace SsoClient::Access

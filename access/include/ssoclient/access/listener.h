@@ -60,12 +60,14 @@ struct DeviationRecord {
   std::string issued;     ///< as text
 };
 
-/// A refresh has failed, and the last token is served until it is no longer usable.
+/// A refresh has failed, and the last token is served until it is no longer usable; or the first
+/// request for a token of `TokenSourceConfig::keepFresh` has failed.
 struct RefreshFailureRecord {
   std::string source;
   FailureKind failure = FailureKind::kNone;
   std::string message;
-  Tarnik::System::DateTime usableUntil;
+  /// None when there is no token.
+  boost::optional<Tarnik::System::DateTime> usableUntil{};
   std::chrono::milliseconds nextAttempt{0};  ///< from now
 };
 

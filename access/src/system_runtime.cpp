@@ -1,0 +1,54 @@
+#include <algorithm>
+#include <chrono>
+#include <mutex>
+#include <random>
+#include <utility>
+
+#include <tarnik/system/thread_pool.h>
+
+#include "process_hooks.h"
+#include "runtime.h"
+
+namespace SsoClient::Access {
+
+namespace {
+
+class SystemRuntime final : public Runtime {
+ public:
+  Instant Now() const override { return Instant::Now(); }
+
+  double Draw() override {
+    // Not an engine with a state, which a forked child would share with its parent.
+    const std::lock_guard lock(mutex_);
+    return std::generate_canonical<double, 32>(random_);
+  }
+
+  void Run(std::function<void()> work) override {
+    pool_->Run(std::move(work));
+    WatchProcessEnd();
+  }
+
+  Tarnik::Ref<Tarnik::System::CancellableItem> RunAt(Instant::Steady time,
+                                                     std::function<void()> action) override {
+    // Rounded up, so that the time has come when the action runs.
+    const auto delay = std::max(
+        std::chrono::ceil<std::chrono::microseconds>(time - std::chrono::steady_clock::now()),
+        std::chrono::microseconds(0));
+    auto item = pool_->RunAfter(static_cast<unsigned long>(delay.count()), std::move(action));
+    WatchProcessEnd();
+    return item;
+  }
+
+ private:
+  const Tarnik::Ref<Tarnik::System::ThreadPool> pool_ = Tarnik::System::GetThreadPool();
+  std::mutex mutex_;
+  std::random_device random_;
+};
+
+}  // namespace
+
+std::shared_ptr<Runtime> CreateSystemRuntime() {
+  return std::make_shared<SystemRuntime>();
+}
+
+}  // namespace SsoClient::Access
