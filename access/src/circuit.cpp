@@ -21,6 +21,9 @@ void Circuit::OnAnswer() {
 }
 
 void Circuit::OnFailure(Instant::Steady now, std::chrono::milliseconds retryAfter, double draw) {
+  if (state_ == CircuitState::kOpen) {
+    return;  // an attempt from before
+  }
   ++failures_;
   const bool opens = state_ == CircuitState::kHalfOpen || failures_ >= config_.failuresToOpen;
   if (opens) {
