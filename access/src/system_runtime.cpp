@@ -1,4 +1,3 @@
-#include <algorithm>
 #include <chrono>
 #include <mutex>
 #include <random>
@@ -30,10 +29,10 @@ class SystemRuntime final : public Runtime {
 
   Tarnik::Ref<Tarnik::System::CancellableItem> RunAt(Instant::Steady time,
                                                      std::function<void()> action) override {
+    const Instant::Steady now = std::chrono::steady_clock::now();
     // Rounded up, so that the time has come when the action runs.
-    const auto delay = std::max(
-        std::chrono::ceil<std::chrono::microseconds>(time - std::chrono::steady_clock::now()),
-        std::chrono::microseconds(0));
+    const auto delay = std::chrono::ceil<std::chrono::microseconds>(
+        time > now ? time - now : std::chrono::steady_clock::duration(0));
     auto item = pool_->RunAfter(static_cast<unsigned long>(delay.count()), std::move(action));
     WatchProcessEnd();
     return item;

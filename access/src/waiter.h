@@ -73,8 +73,6 @@ class CallbackCaller final : public Waiter, public std::enable_shared_from_this<
   void Receive(Answer answer) noexcept override;
   /// The same, but throws if no worker can be started. The callback then never runs.
   void ReceiveOrThrow(Answer answer);
-  /// The callback never runs. Called before there is an answer.
-  void Drop() noexcept { callback_ = nullptr; }
 
  private:
   void Schedule();

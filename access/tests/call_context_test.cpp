@@ -19,7 +19,8 @@ TEST(CallContextTest, WithinIsFromNow) {
 }
 
 TEST(CallContextTest, WithinNegativeIsNow) {
-  EXPECT_LE(CallContext::Within(std::chrono::hours(-1)).deadline, CallContext::Clock::now());
+  const CallContext context = CallContext::Within(std::chrono::hours(-1));
+  EXPECT_LE(context.deadline, CallContext::Clock::now());
   EXPECT_GT(CallContext::Within(std::chrono::hours::min()).deadline,
             CallContext::Clock::now() - std::chrono::hours(1));
 }

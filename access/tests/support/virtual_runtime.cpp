@@ -154,6 +154,12 @@ void VirtualRuntime::RefuseWork(bool isRefused) {
   refusesWork_ = isRefused;
 }
 
+void VirtualRuntime::DropWork() {
+  std::deque<std::function<void()>> dropped;
+  const std::lock_guard lock(mutex_);
+  dropped.swap(work_);
+}
+
 std::size_t VirtualRuntime::TimersArmed() const {
   return timers_->Size();
 }

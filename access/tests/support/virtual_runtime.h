@@ -40,6 +40,8 @@ class VirtualRuntime final : public Runtime {
   void SetDraw(std::function<double()> draw);
   /// From now on, `Run` throws a `Tarnik::ResourceException`.
   void RefuseWork(bool isRefused);
+  /// As at the end of the process: what is queued is destroyed without having run.
+  void DropWork();
   std::size_t TimersArmed() const;
   std::size_t WorkQueued() const;
 
