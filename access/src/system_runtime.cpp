@@ -1,3 +1,4 @@
+#include <atomic>
 #include <chrono>
 #include <mutex>
 #include <random>
@@ -23,8 +24,8 @@ class SystemRuntime final : public Runtime {
   }
 
   void Run(std::function<void()> work) override {
+    WatchEnd();
     pool_->Run(std::move(work));
-    WatchProcessEnd();
   }
 
   Tarnik::Ref<Tarnik::System::CancellableItem> RunAt(Instant::Steady time,
@@ -33,13 +34,22 @@ class SystemRuntime final : public Runtime {
     // Rounded up, so that the time has come when the action runs.
     const auto delay = std::chrono::ceil<std::chrono::microseconds>(
         time > now ? time - now : std::chrono::steady_clock::duration(0));
-    auto item = pool_->RunAfter(static_cast<unsigned long>(delay.count()), std::move(action));
-    WatchProcessEnd();
-    return item;
+    WatchEnd();
+    return pool_->RunAfter(static_cast<unsigned long>(delay.count()), std::move(action));
   }
 
  private:
+  // The pool must have been started before.
+  void WatchEnd() {
+    if (!isEndWatched_.load(std::memory_order_relaxed)) {
+      pool_->Post([] {});
+      WatchProcessEnd();
+      isEndWatched_.store(true, std::memory_order_relaxed);
+    }
+  }
+
   const Tarnik::Ref<Tarnik::System::ThreadPool> pool_ = Tarnik::System::GetThreadPool();
+  std::atomic<bool> isEndWatched_{false};
   std::mutex mutex_;
   std::random_device random_;
 };
