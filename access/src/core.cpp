@@ -43,6 +43,14 @@ Failure DeadlineFailure(const Request& request) {
   return Failure::Of(CommunicationException(text));
 }
 
+Failure LeavingFailure(const Request& request, bool isDeadline) noexcept {
+  try {
+    return isDeadline ? DeadlineFailure(request) : CancelledFailure();
+  } catch (const std::bad_alloc&) {
+    return Failure::OutOfMemory();
+  }
+}
+
 }  // namespace
 
 std::shared_ptr<Core> Core::Create(Parts parts) {
@@ -249,9 +257,8 @@ void Core::Leave(const WaiterPtr& waiter, Leaving why) noexcept {
   if (request == nullptr) {
     return;
   }
+  section.GiveAnswer(waiter, {nullptr, LeavingFailure(*request, why == Leaving::kDeadline)});
   section.Cancel(waiter->deadlineTimer);
-  section.GiveAnswer(waiter, {nullptr, why == Leaving::kDeadline ? DeadlineFailure(*request)
-                                                                 : CancelledFailure()});
   request->waiters.erase(waiter);
   --waiting_;
   if (request->waiters.empty() && !request->isBackground) {

@@ -15,7 +15,7 @@ std::shared_ptr<const Tarnik::Exception> CopyOf(const Tarnik::Exception& excepti
 }
 
 // One that is not destroyed.
-std::shared_ptr<const Tarnik::Exception> OutOfMemory() noexcept {
+std::shared_ptr<const Tarnik::Exception> SharedOutOfMemory() noexcept {
   return {std::shared_ptr<void>(), &Tarnik::OutOfMemory()};
 }
 
@@ -57,6 +57,12 @@ Failure Failure::Copy(const Tarnik::Exception& exception) {
   return failure;
 }
 
+Failure Failure::OutOfMemory() noexcept {
+  Failure failure;
+  failure.exception_ = SharedOutOfMemory();
+  return failure;
+}
+
 void Failure::Throw() const {
   if (exception_ != nullptr) {
     exception_->Throw();
@@ -75,7 +81,7 @@ std::shared_ptr<const Tarnik::Exception> Failure::ForCallback() const noexcept {
   } catch (...) {
     // Reported as below.
   }
-  return OutOfMemory();
+  return SharedOutOfMemory();
 }
 
 std::string Failure::Message() const {

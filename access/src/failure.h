@@ -26,6 +26,8 @@ class Failure {
     failure.exception_ = std::make_shared<Exception>(std::move(exception));
     return failure;
   }
+  /// Needs no memory.
+  static Failure OutOfMemory() noexcept;
   /// The exception that is being handled.
   static Failure Current() { return Failure(std::current_exception()); }
 

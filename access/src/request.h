@@ -54,6 +54,8 @@ struct Request {
   /// The pause before the next round; null otherwise.
   Tarnik::Ref<Tarnik::System::CancellableItem> pause;
   std::chrono::milliseconds retryAfter{0};
+  /// The next one in the list of a section that is about to run this one.
+  std::shared_ptr<Request> nextStarted;
 };
 
 }  // namespace SsoClient::Access

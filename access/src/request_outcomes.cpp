@@ -263,7 +263,6 @@ void Core::Detach(Section& section, const RequestPtr& request) {
   }
   const auto found = requests_.find(request->key);
   if (found != requests_.end() && found->second == request) {
-    section.Keep(request);
     requests_.erase(found);
   }
   // An attempt under way has the gate until it has ended.
@@ -274,7 +273,7 @@ void Core::Detach(Section& section, const RequestPtr& request) {
   section.Cancel(request->limit);
   section.Cancel(std::exchange(request->pause, nullptr));
   if (std::holds_alternative<TokenLogin>(config_->login)) {
-    section.Cancel(request->cancellation);
+    section.Do([request] { request->cancellation.Cancel(); });
   }
   if (request->isBackground) {
     --backgroundRequests_;

@@ -1,5 +1,7 @@
 #include "section.h"
 
+#include <utility>
+
 namespace SsoClient::Access {
 
 void Section::Circuit(const EndpointSet::Change& change) {
@@ -11,19 +13,29 @@ void Section::Circuit(const EndpointSet::Change& change) {
   ToListener([record](AccessListener& listener) { listener.OnCircuit(record); });
 }
 
+void Section::GiveAnswer(const WaiterPtr& waiter, Answer answer) noexcept {
+  waiter->dueAnswer = std::move(answer);
+  (lastAnswered_ == nullptr ? firstAnswered_ : lastAnswered_->nextAnswered) = waiter;
+  lastAnswered_ = waiter.get();
+}
+
+void Section::Start(const RequestPtr& request) noexcept {
+  (lastStarted_ == nullptr ? firstStarted_ : lastStarted_->nextStarted) = request;
+  lastStarted_ = request.get();
+}
+
 void Section::Finish() noexcept {
   if (!lock_.owns_lock()) {
     return;
   }
   lock_.unlock();
-  for (auto& [waiter, answer] : answers_) {
-    waiter->Receive(std::move(answer));
+  while (firstAnswered_ != nullptr) {
+    const WaiterPtr waiter = std::exchange(firstAnswered_, nullptr);
+    firstAnswered_ = std::exchange(waiter->nextAnswered, nullptr);
+    waiter->Receive(std::move(waiter->dueAnswer));
   }
   for (const auto& limit : limits_) {
     limit->Cancel();
-  }
-  for (const auto& source : sources_) {
-    source.Cancel();
   }
   for (const auto& item : items_) {
     item->Cancel();
@@ -31,7 +43,9 @@ void Section::Finish() noexcept {
   for (const auto& action : actions_) {
     action();
   }
-  for (const auto& request : started_) {
+  while (firstStarted_ != nullptr) {
+    const RequestPtr request = std::exchange(firstStarted_, nullptr);
+    firstStarted_ = std::exchange(request->nextStarted, nullptr);
     core_.StartWork(request);
   }
   for (const auto& report : reports_) {

@@ -4,6 +4,7 @@
 #include <functional>
 #include <memory>
 #include <mutex>
+#include <new>
 #include <utility>
 #include <vector>
 
@@ -22,46 +23,57 @@ class Section {
   Section(const Section&) = delete;
   Section& operator=(const Section&) = delete;
 
-  void GiveAnswer(WaiterPtr waiter, Answer answer) {
-    answers_.emplace_back(std::move(waiter), std::move(answer));
-  }
-  void Start(const RequestPtr& request) { started_.push_back(request); }
-  void Start(const std::vector<RequestPtr>& requests) {
-    started_.insert(started_.end(), requests.begin(), requests.end());
-  }
-  void Cancel(Tarnik::Ref<Tarnik::System::CancellableItem> item) {
-    if (item != nullptr) {
-      items_.push_back(std::move(item));
+  void GiveAnswer(const WaiterPtr& waiter, Answer answer) noexcept;
+  void Start(const RequestPtr& request) noexcept;
+  void Start(const std::vector<RequestPtr>& requests) noexcept {
+    for (const RequestPtr& request : requests) {
+      Start(request);
     }
   }
-  void Cancel(Tarnik::Ref<Tarnik::Http::CallLimit> limit) {
-    if (limit != nullptr) {
-      limits_.push_back(std::move(limit));
-    }
+  void Cancel(Tarnik::Ref<Tarnik::System::CancellableItem> item) noexcept {
+    AddUnlessNull(items_, std::move(item));
   }
-  void Cancel(const CancellationSource& source) { sources_.push_back(source); }
+  void Cancel(Tarnik::Ref<Tarnik::Http::CallLimit> limit) noexcept {
+    AddUnlessNull(limits_, std::move(limit));
+  }
+  /// Called outside of the lock.
+  void Do(std::function<void()> action) noexcept { AddUnlessNull(actions_, std::move(action)); }
   /// `report` is called if there is a listener.
-  void ToListener(Report report) {
+  void ToListener(Report report) noexcept {
     if (core_.config_->listener != nullptr) {
-      reports_.push_back(std::move(report));
+      AddUnlessNull(reports_, std::move(report));
     }
   }
   void Circuit(const EndpointSet::Change& change);
-  /// Called outside of the lock.
-  void Do(std::function<void()> action) { actions_.push_back(std::move(action)); }
   /// Destroyed outside of the lock.
-  void Keep(std::shared_ptr<const void> object) { kept_.push_back(std::move(object)); }
+  void Keep(std::shared_ptr<const void> object) noexcept {
+    AddUnlessNull(kept_, std::move(object));
+  }
 
   void Finish() noexcept;
 
  private:
+  // Without memory, nothing is added: what is not cancelled ends by itself, later. Answers and
+  // starts, which must not be lost, need none.
+  template <class Element>
+  static void AddUnlessNull(std::vector<Element>& elements, Element element) noexcept {
+    if (!element) {
+      return;
+    }
+    try {
+      elements.push_back(std::move(element));
+    } catch (const std::bad_alloc&) {
+    }
+  }
+
   Core& core_;
   std::vector<std::shared_ptr<const void>> kept_;
-  std::vector<std::pair<WaiterPtr, Answer>> answers_;
-  std::vector<RequestPtr> started_;
+  WaiterPtr firstAnswered_;
+  Waiter* lastAnswered_ = nullptr;
+  RequestPtr firstStarted_;
+  Request* lastStarted_ = nullptr;
   std::vector<Tarnik::Ref<Tarnik::System::CancellableItem>> items_;
   std::vector<Tarnik::Ref<Tarnik::Http::CallLimit>> limits_;
-  std::vector<CancellationSource> sources_;
   std::vector<Report> reports_;
   std::vector<std::function<void()>> actions_;
   std::unique_lock<std::mutex> lock_;

@@ -34,6 +34,9 @@ class Waiter {
   /// What it waits for; null before and after. Under the lock of the core, as is the timer.
   std::shared_ptr<Request> request;
   Tarnik::Ref<Tarnik::System::CancellableItem> deadlineTimer;
+  /// The answer that a section is about to give, and the next one in its list.
+  Answer dueAnswer;
+  std::shared_ptr<Waiter> nextAnswered;
   /// Set by the caller's thread only.
   CancellationRegistration cancellation;
 

@@ -193,6 +193,31 @@ TEST_F(CoreTest, DeadlineInAPauseSaysWhatHadFailed) {
   EXPECT_EQ(Attempts(), attempts);
 }
 
+TEST_F(CoreTest, TwoThousandAbandonedCallsLeaveNothing) {
+  Make();
+  scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
+    runtime->Settle();
+    runtime->Pass(seconds(1));
+    EXPECT_TRUE(limit.IsCancelled());
+    return Failed<CommunicationException>(FailureKind::kAbandoned, "Cancelled.");
+  });
+  std::vector<std::shared_ptr<Reply>> replies;
+  for (int i = 0; i < 2000; ++i) {
+    replies.push_back(Ask(SpecFor(std::to_string(i)), Within(seconds(1))));
+  }
+  runtime->Settle();
+  for (const auto& reply : replies) {
+    ASSERT_TRUE(reply->Has());
+    ASSERT_TRUE(reply->Is<CommunicationException>());
+  }
+  EXPECT_EQ(Attempts(), 1U);
+  EXPECT_EQ(runtime->TimersArmed(), 0U);
+  EXPECT_EQ(runtime->WorkQueued(), 0U);
+  EXPECT_EQ(source->Metrics().callersWaiting, 0U);
+  scripts[0]->Set(Issues(hours(1)));
+  EXPECT_NE(Get(spec).token, nullptr);
+}
+
 TEST_F(CoreTest, MinimumLifeIsKept) {
   ForAll(Issues(hours(1)));
   Make();

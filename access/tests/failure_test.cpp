@@ -77,6 +77,11 @@ TEST(FailureTest, ShortageOfMemoryIsReportedAsSuch) {
   EXPECT_EQ(failure.ForCallback().get(), &Tarnik::OutOfMemory());
 }
 
+TEST(FailureTest, OutOfMemoryIsThePlatforms) {
+  EXPECT_EQ(Failure::OutOfMemory().ForCallback().get(), &Tarnik::OutOfMemory());
+  EXPECT_THROW(Failure::OutOfMemory().Throw(), Tarnik::ResourceException);
+}
+
 }  // namespace
 
 }  // namespace SsoClient::Access

@@ -72,8 +72,9 @@ struct RefreshFailureRecord {
 };
 
 /// Sees what a token source does. Records never contain a password, a key, or the text of a token.
-/// The functions do nothing unless they are overridden. They run on worker threads of the platform,
-/// several at once, should return quickly, and must not throw or call the source. Later versions
+/// The functions do nothing unless they are overridden. They run on worker threads of the platform
+/// (on others only when no worker can be started), several at once, should return quickly, and must
+/// not throw or call the source. Later versions
 /// add no functions here, but may add an interface that is derived from this one.
 class SSOCLIENT_ACCESS_EXPORT AccessListener {
  public:
