@@ -44,6 +44,7 @@ struct Request {
   CancellationSource cancellation;
 
   int attempts = 0;
+  int undecided = 0;  ///< attempts that no service has decided
   int rounds = 1;
   EndpointSet::Asked asked;
   std::vector<std::string> reasons;  ///< the last failure of each endpoint in this request

@@ -151,7 +151,7 @@ bool Core::GoOnAfterFailure(Section& section, const RequestPtr& request, const S
   request->lastFailure = Failure(outcome.failure);
   request->lastKind = outcome.kind;
   request->retryAfter = outcome.retryAfter;
-  if (request->attempts < AttemptLimit(*request) &&
+  if (++request->undecided < AttemptLimit(*request) &&
       endpoints_.CanAdmit(request->asked, now.steady)) {
     return true;
   }
@@ -163,7 +163,6 @@ bool Core::GoOnAfterDecision(Section& section, const RequestPtr& request, const 
                              const AttemptOutcome& outcome, const Instant& now) {
   if (step.operation == AttemptOperation::kRenewal) {
     request->mayRenew = false;
-    --request->attempts;
     return true;
   }
   if (step.operation == AttemptOperation::kExchange && IsRefusal(outcome.kind)) {
@@ -171,7 +170,6 @@ bool Core::GoOnAfterDecision(Section& section, const RequestPtr& request, const 
     section.Do([source, base = step.base] { source->Invalidate(*base); });
     if (!std::exchange(request->hasReplacedBase, true)) {
       request->base = nullptr;
-      --request->attempts;
       return true;
     }
     std::erase_if(refusedExchanges_,
@@ -194,7 +192,7 @@ void Core::EndRound(Section& section, const RequestPtr& request, const Instant& 
   const bool hasAsked =
       std::find(request->asked.begin(), request->asked.end(), true) != request->asked.end();
   const auto admission = endpoints_.ClosedAdmission();
-  if (!hasAsked || !admission || request->attempts >= AttemptLimit(*request)) {
+  if (!hasAsked || !admission || request->undecided >= AttemptLimit(*request)) {
     FailUndecided(section, request, now);
     return;
   }

@@ -125,6 +125,36 @@ TEST_F(FailoverTest, RetryAfterIsHonouredUpToTheLimit) {
   EXPECT_EQ(times[2] - times[1], seconds(20));
 }
 
+TEST_F(FailoverTest, PauseIsNotShorterThanTheEndpointIsLeftOut) {
+  config.endpoints.resize(1);
+  config.retry.attempts = 2;
+  // Each failure draws once for the endpoint, and then once for the call.
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    runtime->SetDraw([draw = 1.8]() mutable { return draw -= 0.9; });
+    const bool isFirst = scripts[0]->Count() == 1;
+    return isFirst ? Unavailable(seconds(5)) : Issued(NewToken(hours(1)));
+  });
+  Make();
+  const auto reply = Ask(spec);
+  runtime->Advance(seconds(10));
+  ASSERT_TRUE(reply->Has());
+  EXPECT_NE(reply->token, nullptr);
+}
+
+TEST_F(FailoverTest, AttemptThatFailsAfterAllHaveLeftDoesNotCount) {
+  config.endpoints.resize(1);
+  config.retry.failuresToOpen = 1;
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    runtime->Pass(seconds(2));
+    return Unreachable();
+  });
+  Make();
+  Get(spec, Within(seconds(1)));
+  ASSERT_EQ(listener->Ended().size(), 1U);
+  EXPECT_EQ(listener->Ended()[0].failure, FailureKind::kAbandoned);
+  EXPECT_TRUE(listener->Circuits().empty());
+}
+
 TEST_F(FailoverTest, CallWhileTheOnlyEndpointAsksToWaitFailsAtOnce) {
   config.endpoints.resize(1);
   config.retry.attempts = 1;

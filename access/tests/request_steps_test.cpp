@@ -171,6 +171,40 @@ TEST_F(AccountProtectionTest, GatePassesOnWhenTheOneWhoseTurnItIsLeavesInTheLogi
   EXPECT_NE(third->token, nullptr);
 }
 
+TEST_F(AccountProtectionTest, GatePassesOnWhenTheSecretHasChanged) {
+  int calls = 0;
+  config.login = PasswordLogin{"alice", [&] {
+                                 // The second request logs in with another one when it has its
+                                 // turn.
+                                 return std::string(++calls == 4 ? "two" : "one");
+                               }};
+  config.endpoints.resize(1);
+  Make();
+  bool isFirst = true;
+  std::shared_ptr<Reply> third;
+  bool hadTurn = false;
+  scripts[0]->Set([&](const AttemptRequest& request, Limit&) {
+    if (std::exchange(isFirst, false)) {
+      runtime->Settle();
+      return Fault();
+    }
+    if (request.secret == "two") {
+      runtime->Settle();
+      hadTurn = third->Has();
+      return Fault();
+    }
+    return Issued(NewToken(hours(1)));
+  });
+  const auto first = Ask(spec);
+  const auto second = Ask(SpecFor("https://second.example.com"));
+  third = Ask(SpecFor("https://third.example.com"));
+  runtime->Settle();
+  EXPECT_TRUE(hadTurn);
+  EXPECT_TRUE(first->Is<SsoException>());
+  EXPECT_TRUE(second->Is<SsoException>());
+  EXPECT_NE(third->token, nullptr);
+}
+
 TEST_F(AccountProtectionTest, AbandonedLoginKeepsTheGateUntilItHasEnded) {
   Make();
   std::size_t during = 0;
@@ -340,6 +374,29 @@ TEST_F(RenewalTest, FailedRenewalLogsInAlsoWithOneAttempt) {
   EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kRenewal);
   EXPECT_EQ(scripts[0]->Seen()[2].operation, AttemptOperation::kLogin);
   EXPECT_EQ(scripts[1]->Count(), 0U);
+  EXPECT_EQ(listener->Begun()[1].number, 1);
+  EXPECT_EQ(listener->Begun()[2].number, 2);
+}
+
+TEST_F(RenewalTest, FailedRenewalLeavesAllAttemptsToTheLogin) {
+  config.endpoints.resize(1);
+  config.retry.attempts = 2;
+  config.retry.firstDelay = milliseconds(0);
+  Make();
+  Get(spec);
+  int logins = 0;
+  scripts[0]->Set(
+      [&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+        if (request.operation == AttemptOperation::kRenewal) {
+          return Fault();
+        }
+        return ++logins == 1 ? Unreachable() : issue(request, limit);
+      });
+  CallContext context;
+  context.minimumLife = minutes(50);
+  runtime->Advance(minutes(20));
+  EXPECT_NE(Get(spec, context).token, nullptr);
+  EXPECT_EQ(logins, 2);
 }
 
 TEST_F(RenewalTest, RenewalThatNoServiceDecidedIsRepeatedAtTheNextEndpoint) {
@@ -361,6 +418,15 @@ TEST_F(RenewalTest, RefusedRenewalIsNotARefusedLogin) {
   RefreshOne();
   EXPECT_EQ(scripts[0]->Count(), 3U);
   EXPECT_NE(Get(SpecFor("https://other.example.com")).token, nullptr);
+}
+
+TEST_F(RenewalTest, TokenThatHasEndedIsNotRenewed) {
+  Make();
+  Get(spec);
+  runtime->MoveWallClock(hours(2));
+  EXPECT_NE(Get(spec).token, nullptr);
+  ASSERT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kLogin);
 }
 
 TEST_F(RenewalTest, InvalidatedTokenIsNotRenewed) {

@@ -72,6 +72,19 @@ TEST_F(TokenSourceImplTest, ChildMayDestroyASourceThatItHasNotUsed) {
             0);
 }
 
+TEST_F(TokenSourceImplTest, CallsOfTheParentAreNotAnsweredInTheChild) {
+  Make();
+  const auto reply = Ask(spec);
+  EXPECT_EQ(InChild([&] {
+              source.reset();
+              runtime->DropWork();
+              return reply->calls;
+            }),
+            0);
+  runtime->Settle();
+  EXPECT_EQ(reply->calls, 1);
+}
+
 TEST_F(TokenSourceImplTest, SourceThatWasStoppedIsStoppedInTheChild) {
   Make();
   source->Stop(milliseconds(0));
