@@ -5,13 +5,12 @@
 namespace SsoClient::Access {
 
 bool Circuit::Admit(Instant::Steady now) {
-  if (state_ == CircuitState::kClosed) {
-    return now >= retryAt_;
-  }
-  if (state_ == CircuitState::kHalfOpen || now < retryAt_) {
+  if (!CanAdmit(now)) {
     return false;
   }
-  state_ = CircuitState::kHalfOpen;
+  if (state_ == CircuitState::kOpen) {
+    state_ = CircuitState::kHalfOpen;
+  }
   return true;
 }
 
@@ -22,6 +21,9 @@ void Circuit::OnAnswer() {
 }
 
 void Circuit::OnFailure(Instant::Steady now, std::chrono::milliseconds retryAfter, double draw) {
+  if (state_ == CircuitState::kOpen) {
+    return;  // an attempt from before
+  }
   ++failures_;
   const bool opens = state_ == CircuitState::kHalfOpen || failures_ >= config_.failuresToOpen;
   if (opens) {

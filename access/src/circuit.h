@@ -22,6 +22,10 @@ class Circuit {
   /// When the endpoint may be asked again; in the past for a closed circuit.
   Instant::Steady RetryAt() const noexcept { return retryAt_; }
 
+  /// True when `Admit` would be.
+  bool CanAdmit(Instant::Steady now) const noexcept {
+    return state_ != CircuitState::kHalfOpen && now >= retryAt_;
+  }
   /// True when the caller may ask the endpoint. It must then report the outcome.
   bool Admit(Instant::Steady now);
   /// The endpoint has answered, also with a refusal.

@@ -71,18 +71,21 @@ struct DeviationRecord {
   std::string issued;     ///< as text
 };
 
-/// A refresh has failed, and the last token is served until it is no longer usable.
+/// A refresh has failed, and the last token is served until it is no longer usable; or the first
+/// request for a token of `TokenSourceConfig::keepFresh` has failed.
 struct RefreshFailureRecord {
   std::string source;
   FailureKind failure = FailureKind::kNone;
   std::string message;
-  Tarnik::System::DateTime usableUntil;
+  /// None when there is no token.
+  boost::optional<Tarnik::System::DateTime> usableUntil{};
   std::chrono::milliseconds nextAttempt{0};  ///< from now
 };
 
 /// Sees what a token source does. Records never contain a password, a key, or the text of a token.
-/// The functions do nothing unless they are overridden. They run on worker threads of the platform,
-/// several at once, should return quickly, and must not throw or call the source. Later versions
+/// The functions do nothing unless they are overridden. They run on worker threads of the platform
+/// (on others only when no worker can be started), several at once, should return quickly, and must
+/// not throw or call the source. Later versions
 /// add no functions here, but may add an interface that is derived from this one.
 class SSOCLIENT_ACCESS_EXPORT AccessListener {
  public:

@@ -32,7 +32,8 @@ struct RefreshConfig {
   /// both excluded.
   double fraction = 0.75;
   /// How far that moment is moved at random, once for each token: by at most this fraction of the
-  /// lifetime, earlier or later. At least 0; what would leave the range between 0 and 1 is cut off.
+  /// lifetime, earlier or later. Between 0 and 1; what would leave the lifetime is cut off, and
+  /// what would be before a tenth of it is put off until then.
   double jitter = 0.1;
   /// A token is handed out only while it has at least a twentieth of its lifetime left, limited to
   /// this. Not negative.
@@ -55,7 +56,8 @@ struct RetryConfig {
   /// A longer `Retry-After` of the service counts as this.
   std::chrono::milliseconds longestRetryAfter{std::chrono::minutes{5}};
   /// Consecutive failures after which an endpoint is left out until a probe succeeds; at least 1.
-  /// Attempts that nobody waited for any longer do not count.
+  /// Attempts that nobody waited for any longer do not count; but when the deadlines of all callers
+  /// have passed in one, the next request begins at another endpoint.
   int failuresToOpen = 3;
   /// How long a refused login is answered from memory, unless the secret changes.
   std::chrono::seconds refusalMemory{std::chrono::minutes{5}};
@@ -83,7 +85,8 @@ struct TokenSourceConfig {
   RetryConfig retry{};
   CacheConfig cache{};
   /// Tokens that the source requests when it is created and keeps fresh although nobody asks for
-  /// them, so that the first call does not wait. Failures are reported to the listener.
+  /// them, so that the first call does not wait. Failures are reported to the listener. At most
+  /// `cache.capacity`; these tokens are not evicted.
   std::vector<TokenSpec> keepFresh{};
   /// May be null.
   std::shared_ptr<AccessListener> listener{};
@@ -134,9 +137,11 @@ struct TokenSourceMetrics {
 /// SOAP fault and a token that is not accepted are decisions: no other endpoint is asked.
 ///
 /// A refused login reaches one endpoint once, however many callers and specs there are: until a
-/// login has succeeded with a secret, only one is under way. The refusal is then answered from
-/// memory, with the same exception class and message, until the secret changes or
-/// `RetryConfig::refusalMemory` has passed. The refusal of an exchange counts only for its spec.
+/// login has succeeded with a secret, only one is under way, and again when the last success was
+/// more than ten seconds ago. The refusal is then answered from memory, with the same exception
+/// class and message, until the secret changes or `RetryConfig::refusalMemory` has passed. When an
+/// exchange is refused, the token to exchange is replaced once; a second refusal is remembered in
+/// the same way, but only for its spec.
 ///
 /// A source may be used in a forked child, where it begins with an empty cache. When the process
 /// ends, calls end as those of `SecurityTokenService` do. Destroying a source stops it; the last
@@ -147,8 +152,9 @@ struct TokenSourceMetrics {
 class SSOCLIENT_ACCESS_EXPORT TokenSource {
  public:
   /// Receives a token and null, or null and the exception, which is valid only during the call.
-  /// Called exactly once, on a worker thread of the platform's pool, where it may block. It must
-  /// not throw: an exception that leaves it ends the process.
+  /// Called exactly once, on a worker thread of the platform's pool, where it may block. Only when
+  /// no worker can be started is it called on another thread of the platform, or on the one that
+  /// cancels or stops. It must not throw: an exception that leaves it ends the process.
   using TokenCallback =
       std::function<void(const std::shared_ptr<const SamlToken>&, const Tarnik::Exception*)>;
 
@@ -162,13 +168,16 @@ class SSOCLIENT_ACCESS_EXPORT TokenSource {
   ///    the request that the spec describes cannot be sent; nothing is then sent;
   ///  - `CommunicationException` when the deadline passes, with what the call was waiting for, and
   ///    when the endpoints have failed, with the reason of each;
+  ///  - `SsoException` when the service grants less than `CallContext::minimumLife`, or issues a
+  ///    token that has ended;
   ///  - `Tarnik::CancelledException` when the caller has cancelled;
   ///  - `Tarnik::InvalidStateException` after `Stop`;
   ///  - the exceptions of the login's functions.
   virtual std::shared_ptr<const SamlToken> GetToken(const TokenSpec& spec,
                                                     const CallContext& context = {}) = 0;
   /// Returns the token that `GetToken` would return from the cache, and null if it would have to
-  /// wait. Sends nothing, and never blocks. Throws `Tarnik::InvalidStateException` after `Stop`.
+  /// wait. Sends nothing, and never blocks. Throws `Tarnik::InvalidStateException` after `Stop`,
+  /// and `Tarnik::InvalidArgumentException` for a spec that cannot be sent.
   virtual std::shared_ptr<const SamlToken> TryGetToken(const TokenSpec& spec) = 0;
   /// Does what `GetToken` does without blocking, and reports to `callback` what that returns or
   /// throws; an exception of the login's functions that is not a `Tarnik::Exception` is reported as
