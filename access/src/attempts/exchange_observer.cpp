@@ -76,7 +76,7 @@ class ObservingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::
 
   Ref<ClientResponse> Wait(PendingRequestItem* item, unsigned long timeoutMicroseconds) override {
     try {
-      const Ref<ClientResponse> response = inner_->Wait(item, timeoutMicroseconds);
+      Ref<ClientResponse> response = inner_->Wait(item, timeoutMicroseconds);
       Note(*response);
       return response;
     } catch (const Tarnik::Exception& failure) {
