@@ -38,6 +38,10 @@ TEST(FailureKindTest, ClassesDetermineKinds) {
   EXPECT_EQ(Classify(Tarnik::TimeoutException("")), FailureKind::kTimedOut);
   EXPECT_EQ(Classify(Tarnik::CancelledException("")), FailureKind::kAbandoned);
   EXPECT_EQ(Classify(Tarnik::Ssl::SSLException("")), FailureKind::kTls);
+  EXPECT_EQ(Classify(Tarnik::Ssl::PeerTrustException("")), FailureKind::kTlsTrust);
+  EXPECT_EQ(Classify(Tarnik::Ssl::PeerNameException("")), FailureKind::kTlsName);
+  EXPECT_EQ(Classify(Tarnik::Ssl::TruncationException("")), FailureKind::kCutOff);
+  EXPECT_EQ(Classify(Tarnik::Http::CutOffException("")), FailureKind::kCutOff);
   EXPECT_EQ(Classify(Tarnik::Http::HttpException("")), FailureKind::kBadAnswer);
   EXPECT_EQ(Classify(Tarnik::IOException("")), FailureKind::kUnreachable);
   EXPECT_EQ(Classify(Tarnik::Base64FormatException("")), FailureKind::kBadToken);
