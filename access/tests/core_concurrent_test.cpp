@@ -142,24 +142,26 @@ TEST_F(CoreConcurrentTest, HitsOfManyThreadsAreCounted) {
   EXPECT_EQ(Attempts(), 1U);
 }
 
-TEST_F(CoreConcurrentTest, BlockedCallersOfManyThreadsGetTheToken) {
+class BlockedCallersTest : public SourceFixture {};
+
+TEST_F(BlockedCallersTest, BlockedCallersOfManyThreadsGetTheToken) {
   Make();
-  constexpr int kCallers = 16;
+  constexpr int kBlocked = 16;
   std::atomic<int> answered{0};
   std::vector<std::future<std::shared_ptr<const SamlToken>>> calls;
-  for (int i = 0; i < kCallers; ++i) {
+  for (int i = 0; i < kBlocked; ++i) {
     calls.push_back(std::async(std::launch::async, [&] {
       auto token = source->GetToken(spec, {});
-      if (++answered == kCallers) {
+      if (++answered == kBlocked) {
         runtime->Run([] {});
       }
       return token;
     }));
   }
-  runtime->RunUntil([&] { return answered == kCallers; });
+  runtime->RunUntil([&] { return answered == kBlocked; });
   const auto token = calls[0].get();
   EXPECT_NE(token, nullptr);
-  for (int i = 1; i < kCallers; ++i) {
+  for (int i = 1; i < kBlocked; ++i) {
     EXPECT_EQ(calls[static_cast<std::size_t>(i)].get(), token);
   }
   EXPECT_EQ(Attempts(), 1U);
