@@ -63,20 +63,19 @@ class LogListener final : public AccessListener {
   }
 
   void OnAttemptEnded(const AttemptRecord& attempt) override {
-    const auto milliseconds =
+    const auto elapsed =
         std::chrono::duration_cast<std::chrono::milliseconds>(attempt.duration).count();
     const int level = LevelOf(attempt);
     if (attempt.failure == FailureKind::kNone) {
       LogInternal(
           Logger(), level, "Source '%1': attempt %2 has succeeded: %3 at %4 in %5 ms",
-          {attempt.source, attempt.id, NameOf(attempt.operation), attempt.endpoint, milliseconds});
+          {attempt.source, attempt.id, NameOf(attempt.operation), attempt.endpoint, elapsed});
       return;
     }
-    LogInternal(
-        Logger(), level,
-        "Source '%1': attempt %2 has failed: %3 at %4 in %5 ms, HTTP status %6: %7: %8",
-        {attempt.source, attempt.id, NameOf(attempt.operation), attempt.endpoint, milliseconds,
-         attempt.httpStatus, Access::NameOf(attempt.failure), attempt.message});
+    LogInternal(Logger(), level,
+                "Source '%1': attempt %2 has failed: %3 at %4 in %5 ms, HTTP status %6: %7: %8",
+                {attempt.source, attempt.id, NameOf(attempt.operation), attempt.endpoint, elapsed,
+                 attempt.httpStatus, Access::NameOf(attempt.failure), attempt.message});
   }
 
   void OnRefreshFailed(const RefreshFailureRecord& refresh) override {
