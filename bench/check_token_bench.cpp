@@ -7,6 +7,7 @@
 #include "floor.h"
 #include "peer.h"
 #include "sample_token.h"
+#include "tokenizer.h"
 
 namespace Bench {
 namespace {
@@ -53,6 +54,17 @@ void FloorCheck(benchmark::State& state) {
   }
 }
 BENCHMARK(FloorCheck)->Apply(ForEachSize);
+
+void TokenizerTree(benchmark::State& state) {
+  const SampleToken& sample = GetSampleToken(SizeOf(state));
+  for (auto _ : state) {
+    if (!Tokenize(sample.xml)) {
+      state.SkipWithError("the tokenizer refuses the token");
+      break;
+    }
+  }
+}
+BENCHMARK(TokenizerTree)->Apply(ForEachSize);
 // NOLINTEND(performance-unnecessary-value-param)
 
 }  // namespace

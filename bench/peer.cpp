@@ -5,7 +5,12 @@
 #include <xmlsec/xmlsec.h>
 #include <libxml/parser.h>
 #include <libxml/tree.h>
+#include <libxml/valid.h>
+#include <openssl/pem.h>
+#include <openssl/x509.h>
 #include <xmlsec/crypto.h>
+#include <xmlsec/keys.h>
+#include <xmlsec/openssl/evp.h>
 #include <xmlsec/xmldsig.h>
 #include <xmlsec/xmltree.h>
 
@@ -22,17 +27,50 @@ void InitLibraries() {
   }
 }
 
+// Only the id of the assertion itself, since nothing else is referred to.
+void RegisterId(xmlDocPtr document, xmlNodePtr root) {
+  xmlAttrPtr attribute = xmlHasProp(root, reinterpret_cast<const xmlChar*>("ID"));
+  xmlChar* id = xmlNodeListGetString(document, attribute->children, 1);
+  xmlAddID(nullptr, document, id, attribute);
+  xmlFree(id);
+}
+
 bool VerifyDocument(xmlDocPtr document, xmlSecKeyPtr key) {
-  const xmlChar* ids[] = {reinterpret_cast<const xmlChar*>("ID"), nullptr};
   xmlNodePtr root = xmlDocGetRootElement(document);
-  xmlSecAddIDs(document, root, ids);
+  RegisterId(document, root);
   xmlNodePtr signature = xmlSecFindNode(root, xmlSecNodeSignature, xmlSecDSigNs);
   xmlSecDSigCtxPtr context = xmlSecDSigCtxCreate(nullptr);
-  context->signKey = xmlSecKeyDuplicate(key);
+  // Lent for this check: a context would destroy a key that it still has at its end.
+  context->signKey = key;
   const bool isValid =
       xmlSecDSigCtxVerify(context, signature) == 0 && context->status == xmlSecDSigStatusSucceeded;
+  context->signKey = nullptr;
   xmlSecDSigCtxDestroy(context);
   return isValid;
+}
+
+struct FreeBio {
+  void operator()(BIO* bio) const { BIO_free(bio); }
+};
+struct FreeCertificate {
+  void operator()(X509* certificate) const { X509_free(certificate); }
+};
+
+// A bare public key. A key that xmlsec1 loads from a certificate keeps the certificate, and parts
+// of both are then copied for each check.
+xmlSecKeyPtr MakeKey(const std::string& certificatePem) {
+  const std::unique_ptr<BIO, FreeBio> source(
+      BIO_new_mem_buf(certificatePem.data(), static_cast<int>(certificatePem.size())));
+  const std::unique_ptr<X509, FreeCertificate> certificate(
+      PEM_read_bio_X509(source.get(), nullptr, nullptr, nullptr));
+  EVP_PKEY* publicKey = certificate == nullptr ? nullptr : X509_get_pubkey(certificate.get());
+  // Takes over the public key.
+  xmlSecKeyDataPtr value = publicKey == nullptr ? nullptr : xmlSecOpenSSLEvpKeyAdopt(publicKey);
+  xmlSecKeyPtr key = value == nullptr ? nullptr : xmlSecKeyCreate();
+  if (key == nullptr || xmlSecKeySetValue(key, value) != 0) {
+    throw std::runtime_error("xmlsec1 cannot load the public key");
+  }
+  return key;
 }
 
 }  // namespace
@@ -43,13 +81,7 @@ struct Peer::State {
 
 Peer::Peer(const std::string& certificatePem) : state_(std::make_unique<State>()) {
   InitLibraries();
-  state_->key =
-      xmlSecCryptoAppKeyLoadMemory(reinterpret_cast<const xmlSecByte*>(certificatePem.data()),
-                                   static_cast<xmlSecSize>(certificatePem.size()),
-                                   xmlSecKeyDataFormatCertPem, nullptr, nullptr, nullptr);
-  if (state_->key == nullptr) {
-    throw std::runtime_error("xmlsec1 cannot load the certificate");
-  }
+  state_->key = MakeKey(certificatePem);
 }
 
 Peer::~Peer() {

@@ -10,7 +10,7 @@
 #include <tarnik/http/http_url.h>
 
 int main(int argc, char** argv) {
-  if (argc < 5) {
+  if (argc < 5 || std::string(argv[1]).rfind("https://", 0) != 0) {
     std::cerr << "usage: keep_connections HTTPS_URL CA_FILE STS_CERTIFICATE_FILE TOKEN_FILE...\n";
     return 2;
   }

@@ -11,6 +11,7 @@
 #include "input.h"
 #include "support/libxml2_oracle.h"
 #include "xml_input.h"
+#include "xml_mutator.h"
 
 namespace {
 
@@ -84,6 +85,11 @@ void RequireSameWhenWritten(const Xml::Document& document) {
 }
 
 }  // namespace
+
+extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
+                                               std::size_t maxSize, unsigned seed) {
+  return Fuzz::MutateXml(data, size, maxSize, seed);
+}
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   const std::string text = Fuzz::TextOf(data, size);

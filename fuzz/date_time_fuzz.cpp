@@ -1,5 +1,6 @@
-// A date-time that can be read is also an xs:dateTime to libxml2, which orders two of them in the
-// same way. Printed and read again, it is the same instant.
+// A date-time can be read exactly when the model reads it, as the same instant. It is also an
+// xs:dateTime to libxml2, which orders two of them in the same way. Printed and read again, it is
+// the same instant.
 #include <memory>
 #include <optional>
 
@@ -9,6 +10,7 @@
 #include <tarnik/system/date_time.h>
 
 #include "input.h"
+#include "value_model.h"
 
 namespace {
 
@@ -61,6 +63,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const std::string text = Fuzz::TextOf(data, size);
   const std::string first = text.substr(0, text.find('\n'));
   const auto time = Read(first);
+  const auto model = Fuzz::DateOf(first);
+  Fuzz::Require(time.has_value() == model.has_value());
+  Fuzz::Require(!time || time->GetUtcTime() == *model);
   if (!time) {
     return 0;
   }

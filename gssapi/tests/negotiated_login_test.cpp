@@ -23,6 +23,8 @@
 #include "sts/response_handler.h"
 #include "sts/security_token_service_impl.h"
 #include "support/assertion_text.h"
+#include "support/async_call.h"
+#include "support/forked_child.h"
 #include "support/thrown_message.h"
 
 namespace SsoClient::Testing {
@@ -116,12 +118,20 @@ TokenSpec OneHour() {
 class NegotiatedLoginTest : public RealmFixture {
  protected:
   std::shared_ptr<const SamlToken> Acquire(const Behavior& behavior) {
+    return Connect(behavior).AcquireTokenByGSS(OneHour(), *handler_);
+  }
+  std::shared_ptr<const SamlToken> AcquireAsynchronously() {
+    AsyncCall call;
+    Connect({}).AcquireTokenByGSSAsync(OneHour(), *handler_, call.Callback());
+    return call.Wait().token;
+  }
+
+  /// A client of a new service.
+  SecurityTokenServiceImpl Connect(const Behavior& behavior) {
     service_ = std::make_shared<Service>(serviceKeytab, behavior);
-    return SecurityTokenServiceImpl(std::make_shared<RequestBuilderImpl>(boost::none),
-                                    std::make_shared<OneService>(service_),
-                                    std::make_shared<ResponseHandlerImpl>(),
-                                    std::make_shared<FakeTokenFactory>())
-        .AcquireTokenByGSS(OneHour(), *handler_);
+    return SecurityTokenServiceImpl(
+        std::make_shared<RequestBuilderImpl>(boost::none), std::make_shared<OneService>(service_),
+        std::make_shared<ResponseHandlerImpl>(), std::make_shared<FakeTokenFactory>());
   }
 
   std::shared_ptr<GssapiNegotiationHandler> handler_ =
@@ -173,6 +183,18 @@ TEST_F(NegotiatedLoginTest, ServesLoginsInSequence) {
   EXPECT_THROW(Acquire({.isImpostor = true}), SsoException);
   EXPECT_NE(Acquire({}), nullptr);
   EXPECT_TRUE(handler_->IsEstablished());
+}
+
+// The parent has threads of the pool and its child has not; the handler is the same.
+TEST_F(NegotiatedLoginTest, WorksInAForkedChild) {
+  ASSERT_NE(AcquireAsynchronously(), nullptr);
+  Tarnik::Testing::AwaitIdleThreads();
+  EXPECT_TRUE(Tarnik::Testing::HoldsInChild([this] {
+    return Acquire({}) != nullptr && handler_->IsEstablished() &&
+           AcquireAsynchronously() != nullptr && handler_->IsEstablished() &&
+           service_->Client() == "alice@EXAMPLE.COM";
+  }));
+  EXPECT_NE(AcquireAsynchronously(), nullptr);
 }
 
 // The line is about the empty answer to the last leg. It is harmless.

@@ -102,7 +102,8 @@ class SecurityTokenService {
       const TokenSpec& spec) const = 0;
   /// Requests another token by `token`, which must be bound to the configured key (Web Services
   /// Security: SAML Token Profile 1.1): with other audiences, delegated to another principal, or on
-  /// behalf of the subject of the spec's act-as token.
+  /// behalf of the subject of the spec's act-as token, which should not be `token` itself: many
+  /// services refuse a request that contains one assertion twice.
   virtual std::shared_ptr<const SamlToken> AcquireTokenByToken(const SamlToken& token,
                                                                const TokenSpec& spec) const = 0;
   /// Asks the service whether `token` is valid (WS-Trust 1.3, section 7).

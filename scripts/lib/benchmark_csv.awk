@@ -1,4 +1,5 @@
-# Reads medians from the CSV output of Google Benchmark: cpu[NAME] and real[NAME] in the unit of the benchmark.
+# Reads the best repetition of each benchmark from the CSV output of Google Benchmark: cpu[NAME] and real[NAME] in the
+# unit of the benchmark.
 BEGIN { FS = "," }
 
 /^"?name"?,/ {
@@ -9,12 +10,19 @@ BEGIN { FS = "," }
   next
 }
 
-/_median/ {
+# Aggregates of the repetitions have a name that ends like this.
+/^"[^"]*_(mean|median|stddev|cv)"/ { next }
+
+"cpu_time" in column {
   # The name also says how the time is measured.
   name = $1
-  gsub(/"|_median|\/process_time|\/real_time/, "", name)
-  cpu[name] = $column["cpu_time"]
-  real[name] = $column["real_time"]
+  gsub(/"|\/process_time|\/real_time|\/repeats:[0-9]*/, "", name)
+  keep_smaller(cpu, name, $column["cpu_time"])
+  keep_smaller(real, name, $column["real_time"])
+}
+
+function keep_smaller(values, name, value) {
+  if (value != "" && (!(name in values) || value + 0 < values[name] + 0)) values[name] = value
 }
 
 # Returns whether a value is missing, and if so, prints a message for the row TITLE of a table.

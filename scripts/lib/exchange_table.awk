@@ -3,15 +3,17 @@ function row(title, kind,   ours, bare) {
   ours = real["AcquireToken/" kind]
   bare = real["BareExchange/" kind]
   if (missing(title, ours, bare)) return
-  printf "%-50s %12.1f %12.1f %14.2f %14.1f %14.1f\n", title, ours, bare, ours / bare, \
-    cpu["AcquireToken/" kind], cpu["BareExchange/" kind]
+  our_cpu = cpu["AcquireToken/" kind]
+  bare_cpu = cpu["BareExchange/" kind]
+  printf "%-40s %10.1f %10.1f %12.2f %12.1f %12.1f %13.2f\n", title, ours, bare, ours / bare, our_cpu, bare_cpu, \
+    our_cpu / bare_cpu
 }
 
 END {
-  printf "\n%-50s %12s %12s %14s %14s %14s\n", "a token by password, from the dev STS", "ours us", "bare us", "ours/bare", \
-    "our CPU us", "bare CPU us"
+  printf "\n%-40s %10s %10s %12s %12s %12s %13s\n", "a token by password, from the dev STS", "ours us", "bare us", \
+    "ours/bare", "our CPU us", "bare CPU us", "CPU ours/bare"
   row("full TLS handshakes", "new")
   row("resumed TLS sessions", "resumed")
-  print "Aim: ours/bare at most 1.2."
+  print "Aims: ours/bare at most 1.2; CPU ours/bare at most 1.5 with resumed sessions."
   exit failed
 }

@@ -84,7 +84,8 @@ std::string CreateSamlTokenDescription(const SamlToken& token) {
   token.GetDelegationChain(delegationChain);
   const DateTime& startTime = token.StartTime();
   const DateTime& expirationTime = token.ExpirationTime();
-  const PrincipalId* subject = &token.Subject();
+  // Volatile, since compilers assume that a reference is not null and remove the check for it.
+  const PrincipalId* const volatile subject = &token.Subject();
   const bool isRenewable = token.IsRenewable();
   const bool isDelegable = token.IsDelegable();
   const bool isSolution = token.IsSolution();

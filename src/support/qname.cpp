@@ -8,6 +8,21 @@
 
 namespace SsoClient {
 
+namespace {
+
+// A QName contains no white space, so collapsing it (XML Schema Part 2, section 4.3.6) only removes
+// what is around it.
+std::string_view Collapsed(std::string_view name) {
+  constexpr std::string_view kWhiteSpace = "\t\n\r ";
+  const std::size_t first = name.find_first_not_of(kWhiteSpace);
+  if (first == std::string_view::npos) {
+    return {};
+  }
+  return name.substr(first, name.find_last_not_of(kWhiteSpace) - first + 1);
+}
+
+}  // namespace
+
 QNameView ResolveQNameView(const Tarnik::Xml::ElementNode& context, std::string_view name,
                            std::string_view defaultNamespace) {
   const std::size_t colon = name.find(':');
@@ -26,11 +41,12 @@ QNameView ResolveQNameView(const Tarnik::Xml::ElementNode& context, std::string_
 
 QName ResolveQName(const Tarnik::Xml::ElementNode& context, std::string_view name,
                    std::string_view defaultNamespace) {
-  const QNameView view = ResolveQNameView(context, name, defaultNamespace);
+  const QNameView view = ResolveQNameView(context, Collapsed(name), defaultNamespace);
   return {std::string(view.namespaceUri), std::string(view.localName)};
 }
 
-QNameView ResolveQNameValue(const Tarnik::Xml::ElementNode& context, std::string_view name) {
+QNameView ResolveQNameValue(const Tarnik::Xml::ElementNode& context, std::string_view value) {
+  const std::string_view name = Collapsed(value);
   // Only a name without a prefix needs the default namespace: looking it up walks to the root.
   const bool isPrefixed = name.find(':') != std::string_view::npos;
   return ResolveQNameView(context, name,

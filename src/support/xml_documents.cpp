@@ -1,6 +1,8 @@
 #include "support/xml_documents.h"
 
 #include <tarnik/core/checked_cast.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/core/reader.h>
 #include <tarnik/core/writer.h>
 #include <tarnik/xml/security/canonicalizer.h>
 #include <tarnik/xml/xml_parser.h>
@@ -12,6 +14,27 @@ using Tarnik::Xml::Document;
 using Tarnik::Xml::ElementNode;
 using Tarnik::Xml::TextNode;
 
+namespace {
+
+/// Reads a text of the caller, which must outlive it.
+class TextReader final : public Tarnik::Reader, public Tarnik::ObjectImpl {
+ public:
+  explicit TextReader(std::string_view text) : rest_(text) {}
+
+  std::size_t Read(char* buffer, std::size_t size) override {
+    const std::size_t count = rest_.copy(buffer, size);
+    rest_.remove_prefix(count);
+    return count;
+  }
+
+ private:
+  ~TextReader() override = default;
+
+  std::string_view rest_;
+};
+
+}  // namespace
+
 Ref<Document> ParseDocument(Tarnik::Reader* reader) {
   const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
   const auto parser = Tarnik::Xml::CreateXMLParser(reader, handler.get());
@@ -20,7 +43,7 @@ Ref<Document> ParseDocument(Tarnik::Reader* reader) {
 }
 
 Ref<Document> ParseDocument(const std::string& text) {
-  return ParseDocument(Tarnik::CreateStringReader(text).get());
+  return ParseDocument(Tarnik::MakeRef<TextReader>(text).get());
 }
 
 const TextNode* FirstTextChild(const ElementNode* element) {

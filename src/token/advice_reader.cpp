@@ -14,8 +14,7 @@ namespace {
 using Tarnik::Xml::ElementNode;
 
 AdviceAttribute ReadAdviceAttribute(ChildCursor& cursor) {
-  // A request may ask for advice with empty values, so a token with such values must be readable.
-  const AttributeView view = ReadSamlAttribute(cursor, EmptyValues::kRead);
+  const AttributeView view = ReadSamlAttribute(cursor);
   return {std::string(view.name), {view.values.begin(), view.values.end()}};
 }
 

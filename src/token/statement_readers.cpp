@@ -37,18 +37,11 @@ std::string_view ReadContext(ChildCursor& cursor) {
   return contextClass;
 }
 
-std::string_view ReadValueText(const ElementNode& element, EmptyValues emptyValues) {
-  if (emptyValues == EmptyValues::kRead && element.FirstChild() == nullptr) {
-    return {};
-  }
-  return ReadTextContent(element);
-}
-
-std::string_view ReadValue(ChildCursor& cursor, EmptyValues emptyValues) {
+// A value is a text whatever its type, so xsi:type is not read.
+std::string_view ReadValue(ChildCursor& cursor) {
   const ElementNode& element = cursor.TakeElement("AttributeValue", kSamlNamespace);
   CheckEachAttribute(element, {}, {kTypeAttribute});
-  CheckTypeIsNameable(element);
-  return ReadValueText(element, emptyValues);
+  return element.FirstChild() == nullptr ? std::string_view() : ReadTextContent(element);
 }
 
 void AppendGroups(const Values& values, std::vector<PrincipalId>& groups) {
@@ -108,7 +101,7 @@ SubjectAttributes ReadAttributeStatement(ChildCursor& cursor) {
   return result;
 }
 
-AttributeView ReadSamlAttribute(ChildCursor& cursor, EmptyValues emptyValues) {
+AttributeView ReadSamlAttribute(ChildCursor& cursor) {
   const ElementNode& element = cursor.TakeElement("Attribute", kSamlNamespace);
   CheckAttributes(element, {"Name"}, {"NameFormat", "FriendlyName"});
   AttributeView attribute;
@@ -117,7 +110,7 @@ AttributeView ReadSamlAttribute(ChildCursor& cursor, EmptyValues emptyValues) {
   attribute.friendlyName = element.FindAttribute("FriendlyName").value_or("");
   ChildCursor children = cursor.Into(element);
   while (!children.IsAtEnd()) {
-    attribute.values.push_back(ReadValue(children, emptyValues));
+    attribute.values.push_back(ReadValue(children));
   }
   return attribute;
 }

@@ -25,16 +25,9 @@ struct AttributeView {
   std::vector<std::string_view> values;
 };
 
-/// How an AttributeValue without content is handled.
-enum class EmptyValues {
-  kRefused,
-  kRead,  ///< as an empty string
-};
-
-/// Reads an Attribute and its AttributeValue children, each of which has only text. Throws
-/// `ParseException`.
-AttributeView ReadSamlAttribute(ChildCursor& cursor,
-                                EmptyValues emptyValues = EmptyValues::kRefused);
+/// Reads an Attribute and its AttributeValue children, each of which has only text or no content,
+/// which is an empty text. The types of the values are not read. Throws `ParseException`.
+AttributeView ReadSamlAttribute(ChildCursor& cursor);
 
 }  // namespace SsoClient
 

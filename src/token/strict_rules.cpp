@@ -84,12 +84,6 @@ std::optional<std::string_view> FindTypeAttribute(const ElementNode& element) {
   return element.FindAttribute(kTypeAttribute.namespaceUri, kTypeAttribute.localName);
 }
 
-void CheckTypeIsNameable(const ElementNode& element) {
-  if (const auto type = FindTypeAttribute(element)) {
-    ResolveQNameValue(element, *type);
-  }
-}
-
 std::string_view ReadAttribute(const ElementNode& element, std::string_view name) {
   const std::optional<std::string_view> value = element.FindAttribute(name);
   if (!value) {

@@ -34,10 +34,6 @@ void CheckEachAttribute(const Tarnik::Xml::ElementNode& element,
 /// The value of xsi:type, if the element has it.
 std::optional<std::string_view> FindTypeAttribute(const Tarnik::Xml::ElementNode& element);
 
-/// For elements that are read the same way for any type: throws `ParseException` when
-/// xsi:type is present with an undeclared prefix, because such a value names no type.
-void CheckTypeIsNameable(const Tarnik::Xml::ElementNode& element);
-
 // The readers below return the attribute of this qualified name. They throw `ParseException` when
 // it is missing or its value is not of the kind that they read.
 

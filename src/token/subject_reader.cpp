@@ -68,8 +68,8 @@ void ReadHolderOfKeyData(const ElementNode& data, ChildCursor& children, ParsedS
 }
 
 void ReadBearerData(const ElementNode& data, const ChildCursor& children, ParsedSubject& subject) {
+  // No type requires anything of bearer data, so xsi:type is not read.
   CheckEachAttribute(data, {{"", "NotOnOrAfter"}}, {kTypeAttribute});
-  CheckTypeIsNameable(data);
   subject.notOnOrAfter = ReadDateAttribute(data, "NotOnOrAfter");
   ExpectEmpty(children);
 }

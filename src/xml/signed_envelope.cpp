@@ -6,6 +6,7 @@
 
 #include <tarnik/core/exception.h>
 #include <tarnik/text/string_util.h>
+#include <tarnik/xml/security/ids.h>
 #include <tarnik/xml/security/signature.h>
 
 #include "support/namespaces.h"
@@ -24,15 +25,9 @@ constexpr char kSignatureMethod[] = "http://www.w3.org/2001/04/xmldsig-more#rsa-
 constexpr char kExclusiveC14n[] = "http://www.w3.org/2001/10/xml-exc-c14n#";
 constexpr char kSha256[] = "http://www.w3.org/2001/04/xmlenc#sha256";
 
-// In any namespace: services differ in which attributes they use as ids.
-bool IsSpelledLikeAnId(std::string_view localName) {
-  return localName == "Id" || localName == "ID" || localName == "id";
-}
-
 bool HasId(const ElementNode& element, std::string_view id) {
   for (std::size_t i = 0; i < element.AttributeCount(); ++i) {
-    const auto& attribute = element.AttributeAt(i);
-    if (attribute.Value() == id && IsSpelledLikeAnId(attribute.Qualified().Local())) {
+    if (Tarnik::Xml::Security::PossibleId(element.AttributeAt(i)) == id) {
       return true;
     }
   }

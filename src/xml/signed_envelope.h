@@ -53,9 +53,9 @@ std::shared_ptr<XMLSignedSoapBuilder> MakeSignedSoapBuilderForCertificate(
     const Tarnik::Crypto::Certificate& certificate);
 
 /// Throws `Tarnik::InvalidArgumentException` when a token in the request has the id of the
-/// request's own certificate or signature: a service that finds two elements with one id would
-/// reject the request, or use the wrong element. `envelope` already contains its certificate, if
-/// there is one, but not its signature.
+/// request's own certificate or signature, in any attribute that a service may take for an id: a
+/// service that finds two elements with one id would reject the request, or use the wrong element.
+/// `envelope` already contains its certificate, if there is one, but not its signature.
 void RejectReservedIds(const Tarnik::Xml::ElementNode& envelope);
 
 }  // namespace SsoClient

@@ -7,7 +7,9 @@
 #include "chaos/campaigns.h"
 #include "chaos/peer.h"
 #include "chaos/process_state.h"
-#include "integration/probe_run.h"
+#include "integration/holder_of_key_fixture.h"
+#include "support/child_process.h"
+#include "support/temporary_file.h"
 
 namespace SsoClient::Testing {
 namespace {
@@ -16,8 +18,8 @@ using namespace std::chrono_literals;
 
 /// Runs a program that ends with status 0, and kills it when it has not ended after 50 seconds.
 void RunProgram(const Run& run, std::vector<std::string> command, bool isLeakCheckOff) {
-  command.insert(command.begin(), {"/usr/bin/timeout", "--signal=KILL", "50"});
-  const int status = RunToEnd(std::move(command), isLeakCheckOff);
+  const int status = Tarnik::Testing::RunToEnd(std::move(command),
+                                               {.limit = 50s, .isLeakCheckOff = isLeakCheckOff});
   run.Require(status == 0, "the program ended with status " + std::to_string(status));
 }
 
@@ -26,8 +28,8 @@ struct ProbeFiles {
   explicit ProbeFiles(const DevSts::Server& sts)
       : ca(sts.CaCertificatePem()), signing(sts.SigningCertificatePem()) {}
 
-  const TemporaryFile ca;
-  const TemporaryFile signing;
+  const Tarnik::Testing::TemporaryFile ca;
+  const Tarnik::Testing::TemporaryFile signing;
 };
 
 struct Scenario {
@@ -53,7 +55,8 @@ constexpr int kThreadsInCalls = 0;
 constexpr int kThreadsInCalls = 32;
 #endif
 
-constexpr const char* kForks[] = {"call", "exit", "call-and-exit", "grandchildren", "callback"};
+constexpr const char* kForks[] = {"call",          "sign",          "exit",
+                                  "call-and-exit", "grandchildren", "callback"};
 
 }  // namespace
 
@@ -79,7 +82,9 @@ void RunExits(Run& run) {
 
 void RunForks(Run& run) {
   DevSts::Server sts;
+  sts.RegisterCertificate(kMachine, Holder().certificatePem);
   const ProbeFiles files(sts);
+  const Tarnik::Testing::TemporaryFile holder(Holder().certificatePem + Holder().privateKeyPem);
   const ProcessState before = ProcessState::Settled();
   while (run.HasTime()) {
     const std::string scenario = run.OneOf(kForks);
@@ -87,7 +92,7 @@ void RunForks(Run& run) {
     run.Begin(scenario + ", " + std::to_string(forks) + " forks");
     RunProgram(run,
                {FORK_PROBE, scenario, sts.HttpsUrl(), files.ca.Path(), files.signing.Path(),
-                std::to_string(forks), std::to_string(kThreadsInCalls)},
+                holder.Path(), std::to_string(forks), std::to_string(kThreadsInCalls)},
                /*isLeakCheckOff=*/true);
   }
   RequireState(run, before, run.IsLong());

@@ -32,26 +32,10 @@ void ReportedCall::Report(State& state, const Result& result, const Tarnik::Exce
 
 void ReportedCall::Start(Operation operation, const SecurityTokenService& service,
                          const Arguments& arguments) {
-  const auto report = [state = state_](const auto& result, const Tarnik::Exception* error) {
-    Report(*state, result, error);
-  };
-  switch (operation) {
-    case Operation::Password:
-      service.AcquireTokenAsync(arguments.userName, arguments.password, arguments.spec, report);
-      break;
-    case Operation::Certificate:
-      service.AcquireTokenByCertificateAsync(arguments.spec, report);
-      break;
-    case Operation::Token:
-      service.AcquireTokenByTokenAsync(*arguments.token, arguments.spec, report);
-      break;
-    case Operation::Renew:
-      service.RenewTokenAsync(*arguments.token, arguments.spec.tokenLifetimeSec, report);
-      break;
-    case Operation::Validate:
-      service.ValidateSubjectAsync(*arguments.token, report);
-      break;
-  }
+  StartAsync(operation, service, arguments,
+             [state = state_](const auto& result, const Tarnik::Exception* error) {
+               Report(*state, result, error);
+             });
 }
 
 Outcome ReportedCall::Wait() {

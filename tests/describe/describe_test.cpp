@@ -1,6 +1,9 @@
 #include "describe/describe.h"
 
+#include <array>
+#include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <set>
 #include <string>
 #include <vector>
@@ -91,6 +94,8 @@ TEST(DescribeTest, WritesDelegateWithItsInstant) {
   const DateTime instant = DateTime::Parse("2024-03-05T07:08:09.010Z");
   EXPECT_EQ(Describe(Delegate{{"bob", "CORP"}, instant}),
             "{Name: bob; Domain:CORP} at 2024-03-05T07:08:09.010Z");
+  EXPECT_EQ(Describe(Delegate{{"bob", "CORP"}, DateTime::Parse("2024-03-05T09:08:09+02:00")}),
+            "{Name: bob; Domain:CORP} at 2024-03-05T09:08:09.000+02:00");
 }
 
 TEST(DescribeTest, JoinsAttributeValuesByPosition) {
@@ -187,6 +192,40 @@ TEST(CreateSamlTokenDescriptionTest, ReadsEachValueOnceInOrder) {
             (std::vector<std::string>{"GetGroups", "GetDelegationChain", "StartTime",
                                       "ExpirationTime", "Subject", "IsRenewable", "IsDelegable",
                                       "IsSolution", "ConfirmationType"}));
+}
+
+// A token that returns a null address for its subject, as a token of another compiler can. C++ has
+// no null references, so the function is put into a copy of the virtual table (Itanium C++ ABI,
+// section 2.5), after the two entries before the functions.
+class TokenWithoutSubject {
+ public:
+  TokenWithoutSubject() {
+    constexpr std::size_t kSubjectSlot = 4;
+    void* const* table = nullptr;
+    std::memcpy(&table, static_cast<const void*>(&token_), sizeof table);
+    std::memcpy(table_.data(), table - kEntriesBefore, sizeof table_);
+    table_[kEntriesBefore + kSubjectSlot] = reinterpret_cast<void*>(&NoSubject);
+    table = table_.data() + kEntriesBefore;
+    std::memcpy(static_cast<void*>(&token_), &table, sizeof table);
+  }
+  const SamlToken& Get() const { return token_; }
+
+ private:
+  static constexpr std::size_t kEntriesBefore = 2;
+  static constexpr std::size_t kSlots = 18;
+
+  static const PrincipalId* NoSubject(const SamlToken*) { return nullptr; }
+
+  FakeToken token_;
+  std::array<void*, kEntriesBefore + kSlots> table_{};
+};
+
+TEST(CreateSamlTokenDescriptionTest, WritesAMissingSubjectAsNull) {
+  const TokenWithoutSubject token;
+  EXPECT_EQ(CreateSamlTokenDescription(token.Get()),
+            "SamlToken [subject=(null), groups=[], delegationChain=[], "
+            "startTime=2024-03-05 07:08:09.010 UTC, expirationTime=2024-03-05 08:08:09.000 UTC, "
+            "renewable=false, delegable=false, isSolution=false,confirmationType=0]");
 }
 
 TEST(CreateSamlTokenDescriptionTest, NeverContainsTheXml) {

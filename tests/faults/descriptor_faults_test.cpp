@@ -1,6 +1,7 @@
 // Calls of a process that may open no further descriptor, in a forked child.
 #include <future>
 #include <string>
+#include <vector>
 
 #include <gtest/gtest.h>
 #include <sys/resource.h>
@@ -18,14 +19,21 @@ namespace {
 
 using Tarnik::Testing::HoldsInChild;
 
-/// During its lifetime this process can open no descriptor.
+/// During its lifetime this process can open only `spare` descriptors.
 class DescriptorShortage {
  public:
-  DescriptorShortage() {
+  explicit DescriptorShortage(int spare = 0) {
     getrlimit(RLIMIT_NOFILE, &before_);
-    // The lowest descriptor that is free.
+    std::vector<int> spares;
+    for (int i = 0; i < spare; ++i) {
+      spares.push_back(dup(STDERR_FILENO));
+    }
+    // The lowest descriptor that is free besides them.
     const int lowest = dup(STDERR_FILENO);
     close(lowest);
+    for (const int descriptor : spares) {
+      close(descriptor);
+    }
     const rlimit shortage{static_cast<rlim_t>(lowest), before_.rlim_max};
     setrlimit(RLIMIT_NOFILE, &shortage);
   }
@@ -70,6 +78,15 @@ TEST_F(DescriptorFaultsTest, WithoutDescriptorsForThePoolACallFails) {
   EXPECT_TRUE(HoldsInChild([&] {
     return MessageOf<Tarnik::ResourceException>([&] { client.Login(); }) == kNoPool &&
            client.Login() != nullptr;
+  }));
+}
+
+TEST_F(DescriptorFaultsTest, WithDescriptorsForOneIoThreadACallSucceeds) {
+  constexpr int kOfOneIoThread = 3;
+  const StsClient client = StsClient::WithTls();
+  EXPECT_TRUE(HoldsInChild([&] {
+    const DescriptorShortage shortage(kOfOneIoThread + 1);
+    return client.Login() != nullptr;
   }));
 }
 

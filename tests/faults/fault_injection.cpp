@@ -65,7 +65,7 @@ void* Allocate(std::size_t size) noexcept {
 }
 
 void* AllocateInOpenSsl(std::size_t size, const char* /*file*/, int /*line*/) noexcept {
-  return size == 0 || Fails(FaultKind::kOpenSslAllocation) || FailsOnThisThread()
+  return size == 0 || isMemoryShort || Fails(FaultKind::kOpenSslAllocation) || FailsOnThisThread()
              ? nullptr
              : __real_malloc(size);
 }
@@ -76,8 +76,9 @@ void* ReallocateInOpenSsl(void* memory, std::size_t size, const char* /*file*/,
     std::free(memory);
     return nullptr;
   }
-  return Fails(FaultKind::kOpenSslAllocation) || FailsOnThisThread() ? nullptr
-                                                                     : std::realloc(memory, size);
+  return isMemoryShort || Fails(FaultKind::kOpenSslAllocation) || FailsOnThisThread()
+             ? nullptr
+             : std::realloc(memory, size);
 }
 
 void FreeInOpenSsl(void* memory, const char* /*file*/, int /*line*/) noexcept {

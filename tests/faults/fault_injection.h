@@ -40,7 +40,7 @@ class InjectedFault {
   static void Disarm() noexcept;
 };
 
-/// During its lifetime every allocation fails, on all threads.
+/// During its lifetime every allocation fails, on all threads, also within OpenSSL.
 class MemoryShortage {
  public:
   MemoryShortage() noexcept;

@@ -1,6 +1,7 @@
 // Threads of the pool that cannot be started. Each test begins without threads, in a forked child.
 #include <future>
 #include <string>
+#include <thread>
 #include <typeinfo>
 
 #include <gtest/gtest.h>
@@ -62,6 +63,19 @@ TEST(StartOfThreadsFaultsTest, OneIoThreadIsEnough) {
   EXPECT_TRUE(HoldsInChild([&] {
     const InjectedFault fault(FaultKind::kThreadStart, kSecondIoThread);
     return RunsAnItem() && fault.HasHappened() && client.Login() != nullptr;
+  }));
+}
+
+// Different threads begin their connections on different I/O threads, if there are several.
+TEST(StartOfThreadsFaultsTest, OneIoThreadIsEnoughForCallsOfAllThreads) {
+  const StsClient client = StsClient::WithTls();
+  EXPECT_TRUE(HoldsInChild([&] {
+    const InjectedFault fault(FaultKind::kThreadStart, kSecondIoThread);
+    int tokens = RunsAnItem() && fault.HasHappened() ? 0 : -1;
+    for (int i = 0; i < 2; ++i) {
+      std::thread([&] { tokens += client.Login() != nullptr ? 1 : 0; }).join();
+    }
+    return tokens == 2;
   }));
 }
 

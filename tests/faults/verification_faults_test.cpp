@@ -12,35 +12,24 @@
 #include <ssoclient/exceptions.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/xml/security/key_info_resolver.h>
 
 #include "faults/fault_injection.h"
 #include "support/assertion_text.h"
+#include "support/one_key_resolver.h"
 
 // If an allocation within OpenSSL fails while a token is verified, the token is accepted or the
 // failure is reported; a good token is never said to have been tampered with.
 namespace SsoClient::Testing {
 namespace {
 
-using Tarnik::Ref;
-using Tarnik::Crypto::PublicKey;
-using Tarnik::Xml::Security::KeyInfo;
+using Tarnik::Testing::OneKeyResolver;
 using Tarnik::Xml::Security::KeyInfoResolver;
 
 constexpr const char* kTampered =
     "Failed to verify signature: token might have been tampered with.";
-
-class KeyResolver final : public KeyInfoResolver, public Tarnik::ObjectImpl {
- public:
-  explicit KeyResolver(Ref<const PublicKey> key) : key_(std::move(key)) {}
-  Ref<const PublicKey> Resolve(const KeyInfo& /*keyInfo*/) const override { return key_; }
-
- private:
-  const Ref<const PublicKey> key_;
-};
 
 using DevSts::KeyType;
 using DevSts::SignatureAlgorithm;
@@ -71,7 +60,7 @@ class VerificationFaultsTest : public testing::TestWithParam<SchemeCase> {
   /// OpenSSL does for a key is done each time.
   std::pair<std::string, bool> ReadWithFault(std::size_t index) {
     const auto key = Tarnik::Crypto::CreatePrivateKeyFromPem(signer_.privateKeyPem);
-    const auto resolver = Tarnik::MakeRef<const KeyResolver>(key->GetPublicKey());
+    const auto resolver = Tarnik::MakeRef<const OneKeyResolver>(key->GetPublicKey());
     const InjectedFault fault(FaultKind::kOpenSslAllocation, index);
     return {Message(*resolver), fault.HasHappened()};
   }

@@ -119,6 +119,15 @@ TEST_F(AcquireByTokenTest, AHolderOfKeyTokenMayBeTheActAsToken) {
   EXPECT_THAT(ChainOf(*token), ElementsAre("machine"));
 }
 
+// The request contains one ID twice then.
+TEST_F(AcquireByTokenTest, ReportsTheServicesRefusalOfOneTokenTwice) {
+  const auto token = MachineToken();
+  EXPECT_EQ(MessageOf<SsoException>([&] { ByToken(*token, OnBehalfOf(token)); }),
+            "Unexpected SOAP fault: wsse:InvalidSecurity; request failed.");
+  EXPECT_THAT(Sts().LastRequest().answeredFault,
+              HasSubstr("The request is ambiguous: two elements have the id " + token->Id()));
+}
+
 TEST_F(AcquireByTokenTest, RefusesToActForTheSubjectOfATokenThatIsNotDelegable) {
   EXPECT_EQ(MessageOf<SsoException>([] { ByToken(*MachineToken(), OnBehalfOf(Acquire())); }),
             "Unexpected SOAP fault: wst:InvalidRequest; request failed.");

@@ -1,69 +1,27 @@
 // The examples that read a token from a file or give up, and their status.
-#include <array>
-#include <cstdio>
-#include <cstdlib>
-#include <fstream>
 #include <string>
 
 #include <gmock/gmock.h>
-#include <sys/wait.h>
-#include <unistd.h>
 
 #include "integration/sts_fixture.h"
+#include "support/child_process.h"
+#include "support/temporary_file.h"
 
 namespace SsoClient::Testing {
 namespace {
 
+using Tarnik::Testing::CommandResult;
 using testing::HasSubstr;
 using testing::StartsWith;
 
-/// A folder that is removed with its files.
-class TemporaryFolder {
- public:
-  TemporaryFolder() {
-    char name[] = "/tmp/ssoclient-test-XXXXXX";
-    path_ = mkdtemp(name);
-  }
-  ~TemporaryFolder() {
-    for (const auto& file : files_) {
-      unlink(file.c_str());
-    }
-    rmdir(path_.c_str());
-  }
-  TemporaryFolder(const TemporaryFolder&) = delete;
-  TemporaryFolder& operator=(const TemporaryFolder&) = delete;
-
-  std::string Write(const std::string& name, const std::string& content) {
-    files_.push_back(path_ + "/" + name);
-    std::ofstream(files_.back()) << content;
-    return files_.back();
-  }
-
- private:
-  std::string path_;
-  std::vector<std::string> files_;
-};
-
-struct Outcome {
-  int status;
-  std::string output;  // of both streams
-};
-
-Outcome RunExample(const std::string& command) {
-  Outcome run{-1, {}};
-  FILE* pipe = popen((EXAMPLES_FOLDER "/" + command + " 2>&1").c_str(), "r");
-  std::array<char, 4096> buffer;
-  while (fgets(buffer.data(), buffer.size(), pipe) != nullptr) {
-    run.output += buffer.data();
-  }
-  const int status = pclose(pipe);
-  run.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  return run;
+/// The output is that of both streams.
+CommandResult RunExample(const std::string& command) {
+  return Tarnik::Testing::RunInShell(EXAMPLES_FOLDER "/" + command + " 2>&1");
 }
 
 class ExamplesTest : public StsTest {
  protected:
-  TemporaryFolder folder_;
+  const Tarnik::Testing::TemporaryFolder folder_;
   std::string ca_ = folder_.Write("ca.pem", Sts().CaCertificatePem());
   std::string signing_ = folder_.Write("signing.pem", Sts().SigningCertificatePem());
 };
@@ -71,7 +29,8 @@ class ExamplesTest : public StsTest {
 TEST_F(ExamplesTest, CheckTokenRefusesBearerTokensOfPeersWithACertificate) {
   const auto bearer = Service()->AcquireToken(kUser, kPassword, TenMinutes());
   const auto file = folder_.Write("token.xml", bearer->Xml());
-  const Outcome run = RunExample("check_token " + signing_ + " " + file + " " + signing_ + " here");
+  const CommandResult run =
+      RunExample("check_token " + signing_ + " " + file + " " + signing_ + " here");
   EXPECT_EQ(run.status, 1);
   EXPECT_EQ(run.output, "refused: the token is not bound to the peer's key\n");
   // The token itself is good.
@@ -90,11 +49,11 @@ TEST_F(ExamplesTest, TokenFilesThatCannotBeReadAreFailures) {
            "validate_token " + service + missing,
            "keep_connections " + service + missing,
        }) {
-    const Outcome run = RunExample(command);
+    const CommandResult run = RunExample(command);
     EXPECT_GT(run.status, 0) << command;
     EXPECT_THAT(run.output, HasSubstr("cannot read " + missing)) << command;
   }
-  const Outcome folder = RunExample(check + "/tmp " + signing_ + " here");
+  const CommandResult folder = RunExample(check + "/tmp " + signing_ + " here");
   EXPECT_EQ(folder.status, 1);
   EXPECT_THAT(folder.output, StartsWith("refused: "));
 }
@@ -106,10 +65,10 @@ TEST_F(ExamplesTest, KeepConnectionsFailsIfOneOfTheTokensIsInvalid) {
   const auto validFile = folder_.Write("valid.xml", valid->Xml());
   ASSERT_TRUE(Sts().Revoke(revoked->Id()));
   const std::string command = "keep_connections " + Sts().HttpsUrl() + " " + ca_ + " " + signing_;
-  const Outcome good = RunExample(command + " " + validFile + " " + validFile);
+  const CommandResult good = RunExample(command + " " + validFile + " " + validFile);
   EXPECT_EQ(good.output, "valid: " + validFile + "\nvalid: " + validFile + "\n");
   EXPECT_EQ(good.status, 0);
-  const Outcome run = RunExample(command + " " + revokedFile + " " + validFile);
+  const CommandResult run = RunExample(command + " " + revokedFile + " " + validFile);
   EXPECT_EQ(run.output, "INVALID: " + revokedFile + "\nvalid: " + validFile + "\n");
   EXPECT_EQ(run.status, 1);
 }
@@ -120,15 +79,15 @@ TEST_F(ExamplesTest, LimitACallGivesUpOnlyAtItsDeadline) {
   EXPECT_EQ(RunExample(command + login).status, 0);
 
   // Nothing trusts the certificate of the service.
-  const Outcome untrusted = RunExample("limit_a_call " + Sts().HttpsUrl() + " " + signing_ + " " +
-                                       signing_ + " " + login);
+  const CommandResult untrusted = RunExample("limit_a_call " + Sts().HttpsUrl() + " " + signing_ +
+                                             " " + signing_ + " " + login);
   EXPECT_THAT(untrusted.output, StartsWith("No token: TLS handshake with "));
   EXPECT_EQ(untrusted.status, 1);
 
   DevSts::Misbehavior silent;
   silent.stall = DevSts::Stall::BeforeAnswer;
   Sts().SetMisbehavior(silent);
-  const Outcome late = RunExample(command + login);
+  const CommandResult late = RunExample(command + login);
   EXPECT_THAT(late.output, StartsWith("given up: The caller's deadline has passed. "));
   EXPECT_EQ(late.status, 3);
 }

@@ -3,8 +3,9 @@
 
 #include <gtest/gtest.h>
 
-#include "integration/probe_run.h"
 #include "integration/sts_fixture.h"
+#include "support/child_process.h"
+#include "support/temporary_file.h"
 
 namespace SsoClient::Testing {
 namespace {
@@ -15,8 +16,8 @@ class ExitTest : public StsTest {
   /// handler of the library took; the whole needs no time limit of a call.
   void ExpectEnds(const std::string& scenario, int microseconds) {
     const auto start = std::chrono::steady_clock::now();
-    EXPECT_EQ(RunToEnd({EXIT_PROBE, scenario, Sts().HttpsUrl(), ca_.Path(), signing_.Path(),
-                        std::to_string(microseconds)}),
+    EXPECT_EQ(Tarnik::Testing::RunToEnd({EXIT_PROBE, scenario, Sts().HttpsUrl(), ca_.Path(),
+                                         signing_.Path(), std::to_string(microseconds)}),
               0)
         << scenario << " after " << microseconds << " us";
     EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(30));
@@ -29,8 +30,8 @@ class ExitTest : public StsTest {
   }
 
  private:
-  const TemporaryFile ca_{Sts().CaCertificatePem()};
-  const TemporaryFile signing_{Sts().SigningCertificatePem()};
+  const Tarnik::Testing::TemporaryFile ca_{Sts().CaCertificatePem()};
+  const Tarnik::Testing::TemporaryFile signing_{Sts().SigningCertificatePem()};
 };
 
 TEST_F(ExitTest, ProcessMayExitWhileAsyncCallsAreUnderWay) {

@@ -1,5 +1,5 @@
 // Forks while calls are in progress:
-// fork_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE FORKS THREADS
+// fork_probe SCENARIO URL CA_FILE SIGNING_CERTIFICATE_FILE HOLDER_FILE FORKS THREADS
 // The exit status is 0 when all calls of all processes succeeded.
 #include <algorithm>
 #include <atomic>
@@ -8,6 +8,8 @@
 #include <future>
 #include <iostream>
 #include <map>
+#include <memory>
+#include <stdexcept>
 #include <string>
 #include <thread>
 #include <vector>
@@ -29,6 +31,9 @@ constexpr unsigned kChildLimitSeconds = 60;
 constexpr int kFailed = 3;
 
 const ProbeService* probe = nullptr;
+const ProbeService* holder = nullptr;
+// A token that the parent acquires.
+std::shared_ptr<const SsoClient::SamlToken> boundToken;
 int forks = 0;
 int threads = 0;
 
@@ -82,14 +87,32 @@ void CallEverything() {
   }
 }
 
+std::shared_ptr<const SsoClient::SamlToken> AcquireBound() {
+  SsoClient::TokenSpec spec = ProbeService::Spec();
+  spec.renewable = true;
+  return holder->service->AcquireTokenByCertificate(spec);
+}
+
+/// Signs with the key that the parent has loaded and used.
+void CallWithTheKey() {
+  constexpr long kLifetimeSeconds = 600;
+  for (const auto& token : {AcquireBound(), boundToken}) {
+    if (holder->service->RenewToken(*token, kLifetimeSeconds)->ConfirmationType() !=
+        SsoClient::HOLDER_OF_KEY) {
+      throw std::runtime_error("the renewed token is not bound to the key");
+    }
+  }
+}
+
 /// Threads that are inside calls as long as this object exists.
 class Callers {
  public:
-  explicit Callers(int count) {
+  explicit Callers(
+      int count, void (*call)() = [] { probe->Login(); }) {
     for (int i = 0; i < count; ++i) {
-      threads_.emplace_back([this] {
+      threads_.emplace_back([this, call] {
         while (!isStopping_) {
-          if (StatusOf([] { probe->Login(); }) != EXIT_SUCCESS) {
+          if (StatusOf(call) != EXIT_SUCCESS) {
             hasFailed_ = true;
           }
         }
@@ -111,14 +134,20 @@ class Callers {
   std::vector<std::thread> threads_;
 };
 
-/// Forks children one after the other while threads are inside calls.
-bool ForkUnderLoad(const std::function<void()>& body) {
-  probe->Login();
-  Callers callers(threads);
+/// Forks children one after the other.
+bool ForkRepeatedly(const std::function<void()>& body) {
   bool isGood = true;
   for (int i = 0; i < forks; ++i) {
     isGood = HasSucceeded(ForkChild(body)) && isGood;
   }
+  return isGood;
+}
+
+/// The same while threads are inside calls.
+bool ForkUnderLoad(const std::function<void()>& body) {
+  probe->Login();
+  Callers callers(threads);
+  const bool isGood = ForkRepeatedly(body);
   return callers.Stop() && isGood;
 }
 
@@ -128,6 +157,13 @@ bool CallInChildren() {
 
 bool ExitInChildren() {
   return ForkUnderLoad([] { std::exit(EXIT_SUCCESS); });
+}
+
+bool SignInChildren() {
+  boundToken = AcquireBound();
+  Callers callers(threads, [] { AcquireBound(); });
+  const bool isGood = ForkRepeatedly([] { _exit(StatusOf(CallWithTheKey)); });
+  return callers.Stop() && isGood;
 }
 
 bool CallAndExitInChildren() {
@@ -177,17 +213,19 @@ bool ReturnFromACallbackInTheChild() {
 int main(int argc, char** argv) {
   const std::map<std::string, bool (*)()> scenarios = {
       {"call", CallInChildren},
+      {"sign", SignInChildren},
       {"exit", ExitInChildren},
       {"call-and-exit", CallAndExitInChildren},
       {"grandchildren", CallInGrandchildren},
       {"callback", ReturnFromACallbackInTheChild},
   };
-  const auto scenario = scenarios.find(argc == 7 ? argv[1] : "");
+  const auto scenario = scenarios.find(argc == 8 ? argv[1] : "");
   if (scenario == scenarios.end()) {
     return 2;
   }
   probe = new ProbeService(argv[2], argv[3], argv[4]);
-  forks = std::atoi(argv[5]);
-  threads = std::atoi(argv[6]);
+  holder = new ProbeService(argv[2], argv[3], argv[4], argv[5]);
+  forks = std::atoi(argv[6]);
+  threads = std::atoi(argv[7]);
   return scenario->second() ? EXIT_SUCCESS : kFailed;
 }

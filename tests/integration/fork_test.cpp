@@ -2,11 +2,14 @@
 
 #include <gtest/gtest.h>
 
-#include "integration/probe_run.h"
-#include "integration/sts_fixture.h"
+#include "integration/holder_of_key_fixture.h"
+#include "support/child_process.h"
+#include "support/temporary_file.h"
 
 namespace SsoClient::Testing {
 namespace {
+
+using Tarnik::Testing::TemporaryFile;
 
 // The threads of the parent that are inside calls. The allocator of AddressSanitizer remains locked
 // in a child when another thread allocates during the fork, so there the parent's threads are idle.
@@ -18,19 +21,25 @@ constexpr int kThreads = 32;
 
 // The STS is in this process and the calls are in the probe's, so that only the libraries of the
 // probe are forked.
-class ForkTest : public StsTest {
+class ForkTest : public HolderOfKeyTest {
  protected:
   static int RunProbe(const std::string& scenario, int forks) {
     const TemporaryFile ca(Sts().CaCertificatePem());
     const TemporaryFile signing(Sts().SigningCertificatePem());
-    return RunToEnd({FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(),
-                     std::to_string(forks), std::to_string(kThreads)},
-                    /*isLeakCheckOff=*/true);
+    const TemporaryFile holder(Holder().certificatePem + Holder().privateKeyPem);
+    return Tarnik::Testing::RunToEnd(
+        {FORK_PROBE, scenario, Sts().HttpsUrl(), ca.Path(), signing.Path(), holder.Path(),
+         std::to_string(forks), std::to_string(kThreads)},
+        {.isLeakCheckOff = true});
   }
 };
 
 TEST_F(ForkTest, ChildOfAProcessWithCallsUnderWayCanCall) {
   EXPECT_EQ(RunProbe("call", 25), 0);
+}
+
+TEST_F(ForkTest, ChildOfAProcessThatIsSigningCanAcquireByCertificateAndRenew) {
+  EXPECT_EQ(RunProbe("sign", 10), 0);
 }
 
 TEST_F(ForkTest, ChildOfAProcessWithCallsUnderWayCanExit) {

@@ -94,23 +94,7 @@ std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& 
       promise->set_value(Succeeded(result));
     }
   };
-  switch (operation) {
-    case Operation::Password:
-      service.AcquireTokenAsync(arguments.userName, arguments.password, arguments.spec, report);
-      break;
-    case Operation::Certificate:
-      service.AcquireTokenByCertificateAsync(arguments.spec, report);
-      break;
-    case Operation::Token:
-      service.AcquireTokenByTokenAsync(*arguments.token, arguments.spec, report);
-      break;
-    case Operation::Renew:
-      service.RenewTokenAsync(*arguments.token, arguments.spec.tokenLifetimeSec, report);
-      break;
-    case Operation::Validate:
-      service.ValidateSubjectAsync(*arguments.token, report);
-      break;
-  }
+  StartAsync(operation, service, arguments, report);
   return outcome;
 }
 

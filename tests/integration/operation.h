@@ -48,6 +48,29 @@ struct Outcome {
 Outcome CallNow(Operation operation, const SecurityTokenService& service,
                 const Arguments& arguments);
 
+/// Starts the asynchronous operation with a callback for results of both kinds.
+template <class Callback>
+void StartAsync(Operation operation, const SecurityTokenService& service,
+                const Arguments& arguments, const Callback& callback) {
+  switch (operation) {
+    case Operation::Password:
+      service.AcquireTokenAsync(arguments.userName, arguments.password, arguments.spec, callback);
+      break;
+    case Operation::Certificate:
+      service.AcquireTokenByCertificateAsync(arguments.spec, callback);
+      break;
+    case Operation::Token:
+      service.AcquireTokenByTokenAsync(*arguments.token, arguments.spec, callback);
+      break;
+    case Operation::Renew:
+      service.RenewTokenAsync(*arguments.token, arguments.spec.tokenLifetimeSec, callback);
+      break;
+    case Operation::Validate:
+      service.ValidateSubjectAsync(*arguments.token, callback);
+      break;
+  }
+}
+
 /// Starts the asynchronous operation. `arguments.token` must stay alive until the callback has run.
 std::future<Outcome> CallAsync(Operation operation, const SecurityTokenService& service,
                                const Arguments& arguments);

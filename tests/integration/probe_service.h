@@ -9,9 +9,10 @@
 namespace SsoClient::Testing {
 
 /// A service as a program makes it from files: the TLS trust and the signing certificate of the
-/// STS.
+/// STS, and the client's certificate and key, unless that is empty.
 struct ProbeService {
-  ProbeService(const std::string& url, const std::string& caFile, const std::string& signingFile) {
+  ProbeService(const std::string& url, const std::string& caFile, const std::string& signingFile,
+               const std::string& holderFile = "") {
     Tarnik::Ssl::SSLContextConfig tls;
     tls.caFiles = {caFile};
     sslContext = Tarnik::Ssl::CreateSSLContext(tls);
@@ -21,6 +22,11 @@ struct ProbeService {
     config.url = url;
     config.sslContext = sslContext.get();
     config.tokenFactory = CreateSamlTokenFactory(trustedKeys.get());
+    if (!holderFile.empty()) {
+      config.holderOfKeyConfig =
+          HolderOfKeyConfig{Tarnik::Crypto::LoadCertificates(holderFile).front(),
+                            Tarnik::Crypto::LoadPrivateKey(holderFile)};
+    }
     service = CreateSecurityTokenService(config);
   }
 

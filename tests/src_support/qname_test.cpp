@@ -53,6 +53,28 @@ TEST(ResolveQNameTest, RejectsAnUndefinedPrefixAndNamesItsPlace) {
             "Element p:bat 2,3 uses undefined prefix: `a'");
 }
 
+TEST(ResolveQNameTest, IgnoresWhiteSpaceAroundTheName) {
+  const auto document = ParseXml(R"(<p:r xmlns:p="urn:p"/>)");
+  const auto& root = *document->RootElement();
+  for (const char* name : {" p:n", "p:n ", "\n\tp:n\r\n"}) {
+    EXPECT_EQ(ResolveQName(root, name, ""), (QName{"urn:p", "n"})) << name;
+    EXPECT_EQ(ResolveQNameValue(root, name), (QNameView{"urn:p", "n"})) << name;
+  }
+  EXPECT_EQ(ResolveQName(root, " \n", "urn:default"), (QName{"urn:default", ""}));
+  EXPECT_EQ(ResolveQName(root, " n ", "urn:default"), (QName{"urn:default", "n"}));
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ResolveQName(root, " a:b", ""); }),
+            "Element p:rat 1,1 uses undefined prefix: `a'");
+}
+
+// Only white space around it can be part of the value of a QName.
+TEST(ResolveQNameTest, KeepsWhiteSpaceWithinTheName) {
+  const auto document = ParseXml(R"(<p:r xmlns:p="urn:p"/>)");
+  const auto& root = *document->RootElement();
+  EXPECT_EQ(ResolveQName(root, "p: n", ""), (QName{"urn:p", " n"}));
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ResolveQName(root, "p :n", ""); }),
+            "Element p:rat 1,1 uses undefined prefix: `p '");
+}
+
 TEST(ResolveQNameValueTest, UsesTheDefaultNamespaceInScope) {
   const auto document = ParseXml(R"(<r xmlns="urn:scope"><b xmlns=""/></r>)");
   EXPECT_EQ(ResolveQNameValue(*document->RootElement(), "t"), (QNameView{"urn:scope", "t"}));

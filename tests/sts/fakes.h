@@ -78,7 +78,7 @@ class FakeTransport final : public Transport {
   std::vector<std::string> answers_;
 };
 
-/// Makes a token from any text, or refuses all. May be used from many threads.
+/// Makes a token from any text, or refuses all, or makes none. May be used from many threads.
 class FakeTokenFactory final : public SamlTokenFactory {
  public:
   std::shared_ptr<const SamlToken> CreateToken(const std::string&) const override {
@@ -90,7 +90,7 @@ class FakeTokenFactory final : public SamlTokenFactory {
     if (isRefusing) {
       throw InvalidSignatureException("refused");
     }
-    return std::make_shared<FakeSamlToken>(xml);
+    return makesNone ? nullptr : std::make_shared<FakeSamlToken>(xml);
   }
   std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode*) const override {
     throw std::logic_error("the text must be given");
@@ -100,6 +100,7 @@ class FakeTokenFactory final : public SamlTokenFactory {
   }
 
   bool isRefusing = false;
+  bool makesNone = false;
   mutable std::vector<std::string> texts;
   mutable std::vector<long> tolerances;
 

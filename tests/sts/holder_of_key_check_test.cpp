@@ -16,6 +16,7 @@
 #include <tarnik/core/ref.h>
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/private_key.h>
+#include <tarnik/crypto/public_key.h>
 #include <tarnik/system/date_time.h>
 
 #include "support/holder_of_key.h"
@@ -27,6 +28,7 @@ namespace {
 using namespace std::chrono_literals;
 using Tarnik::InvalidArgumentException;
 using Tarnik::InvalidStateException;
+using Tarnik::Crypto::KeyAlgorithm;
 using Tarnik::System::DateTime;
 using Tarnik::System::GetUtcDateTime;
 
@@ -87,8 +89,26 @@ class ForeignCertificate final : public Tarnik::Crypto::Certificate, public Tarn
 /// A private key that the caller implements and that claims to match.
 class ForeignKey final : public Tarnik::Crypto::PrivateKey, public Tarnik::ObjectImpl {
  public:
-  Tarnik::Ref<const Tarnik::Crypto::PublicKey> GetPublicKey() const override { return nullptr; }
+  explicit ForeignKey(Tarnik::Ref<const Tarnik::Crypto::PublicKey> half) : half_(std::move(half)) {}
+
+  Tarnik::Ref<const Tarnik::Crypto::PublicKey> GetPublicKey() const override { return half_; }
   bool Matches(const Tarnik::Crypto::Certificate&) const override { return true; }
+
+ private:
+  Tarnik::Ref<const Tarnik::Crypto::PublicKey> half_;
+};
+
+/// A public half of this kind and length.
+class ForeignHalf final : public Tarnik::Crypto::PublicKey, public Tarnik::ObjectImpl {
+ public:
+  ForeignHalf(KeyAlgorithm algorithm, int bits) : algorithm_(algorithm), bits_(bits) {}
+
+  KeyAlgorithm Algorithm() const noexcept override { return algorithm_; }
+  int Bits() const noexcept override { return bits_; }
+
+ private:
+  KeyAlgorithm algorithm_;
+  int bits_;
 };
 
 TEST(HolderOfKeyCheckTest, RefusesCertificatesThatHoldNoKey) {
@@ -113,8 +133,26 @@ TEST(HolderOfKeyCheckTest, RefusesCertificatesThatHoldNoKey) {
 
 TEST(HolderOfKeyCheckTest, RefusesAForeignKeyWithoutAPublicHalf) {
   auto config = ConfigOf(KeyCredential());
-  config.privateKey = Tarnik::MakeRef<const ForeignKey>();
+  config.privateKey = Tarnik::MakeRef<const ForeignKey>(nullptr);
   EXPECT_EQ(ErrorMessage(config), "HolderOfKeyConfig: the private key has no public half.");
+}
+
+TEST(HolderOfKeyCheckTest, AcceptsOnlyRsaKeysOfTheLeastLength) {
+  auto config = ConfigOf(KeyCredential());
+  const auto errorFor = [&](KeyAlgorithm algorithm, int bits) {
+    config.privateKey =
+        Tarnik::MakeRef<const ForeignKey>(Tarnik::MakeRef<const ForeignHalf>(algorithm, bits));
+    return ErrorMessage(config);
+  };
+  EXPECT_EQ(errorFor(KeyAlgorithm::kRsa, 2048), "Nothing was thrown.");
+  EXPECT_EQ(errorFor(KeyAlgorithm::kRsa, 2047),
+            "HolderOfKeyConfig: the RSA key must have at least 2048 bits.");
+  for (const KeyAlgorithm algorithm :
+       {KeyAlgorithm::kRsaPss, KeyAlgorithm::kEc, KeyAlgorithm::kOther}) {
+    EXPECT_EQ(errorFor(algorithm, 2048),
+              "HolderOfKeyConfig: the key must be an RSA key, since requests are signed with "
+              "RSA-SHA256.");
+  }
 }
 
 std::string PeriodError(const Tarnik::Crypto::Certificate& certificate, const DateTime& now) {

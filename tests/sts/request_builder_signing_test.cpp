@@ -146,6 +146,24 @@ TEST(RequestSigningOrderTest, ABearerTokenIsNotRenewedWhateverTheKey) {
       kNoKeyForRenewal);
 }
 
+TEST(RequestSigningOrderTest, TheTokensTextIsReadLast) {
+  FakeSamlToken broken("<A>");
+  SoapRequest request;
+  const RequestBuilderImpl withoutKey(boost::none);
+  EXPECT_EQ(ThrownMessage<InvalidStateException>(
+                [&] { withoutKey.BuildAcquireTokenByTokenRequest(broken, SpecOf(60), request); }),
+            "No HolderOfKeyConfig provided. Unable to acquire token by token");
+  EXPECT_EQ(ThrownMessage<InvalidArgumentException>(
+                [&] { BuilderWithKey().BuildRenewRequest(broken, 60, request); }),
+            "Unable to renew token: the provided token must be Holder Of Key");
+  broken.confirmationType = HOLDER_OF_KEY;
+  EXPECT_EQ(ThrownMessage<InvalidStateException>(
+                [&] { withoutKey.BuildRenewRequest(broken, 60, request); }),
+            kNoKeyForRenewal);
+  EXPECT_THROW(BuilderWithKey().BuildRenewRequest(broken, 60, request),
+               Tarnik::Xml::XMLParseException);
+}
+
 TEST(RequestSigningOrderTest, TheConfirmationOfAPresentedTokenIsNotExamined) {
   SoapRequest request;
   BuilderWithKey().BuildAcquireTokenByTokenRequest(PresentedToken(BEARER), SpecOf(60), request);
@@ -190,11 +208,31 @@ TEST(RequestSigningTokenTest, IdsInTokensDoNotAffectWhatIsSigned) {
   }
 }
 
+// The service decides whether it accepts one assertion twice. The oracle is one that does not, only
+// because of the id.
+TEST(RequestSigningTokenTest, TheActAsTokenMayBeThePresentedToken) {
+  const FakeSamlToken token = TokenWith("");
+  auto spec = SpecOf(60);
+  spec.actAsToken = std::make_shared<FakeSamlToken>(token);
+  SoapRequest request;
+  BuilderWithKey().BuildAcquireTokenByTokenRequest(token, spec, request);
+  EXPECT_THAT(HeaderOf(request.body), testing::ElementsAre(kTimestamp, kAssertion, kSignature));
+  EXPECT_THAT(request.body, HasSubstr("<wst14:ActAs><Assertion ID=\"_presented\"/></wst14:ActAs>"));
+  EXPECT_THAT(request.body, HasSubstr("#SAMLID\">_presented</wsse:KeyIdentifier>"));
+  EXPECT_EQ(DevSts::VerifyXml(request.body, Credential().certificatePem).reason,
+            "two elements have the id _presented");
+  spec.actAsToken = std::make_shared<FakeSamlToken>("<Assertion ID=\"_other\"/>");
+  BuilderWithKey().BuildAcquireTokenByTokenRequest(token, spec, request);
+  const auto verdict = DevSts::VerifyXml(request.body, Credential().certificatePem);
+  EXPECT_TRUE(verdict.valid) << verdict.reason;
+}
+
 TEST(RequestSigningTokenTest, TokensMayNotContainTheIdsOfTheRequest) {
   for (const std::string& id :
        {std::string("holderOfKeyProofSignature"), std::string("holderOfKeyCertificate")}) {
     for (const std::string& attributes :
-         {"u:Id=\"" + id + "\"" + kUtility, "Id=\"" + id + "\"", "xml:id=\"" + id + "\""}) {
+         {"u:Id=\"" + id + "\"" + kUtility, "Id=\"" + id + "\"", "xml:id=\"" + id + "\"",
+          "iD=\"" + id + "\"", "Id=\" " + id + "&#10;\""}) {
       auto spec = SpecOf(60);
       spec.actAsToken = std::make_shared<FakeSamlToken>(TokenWith(attributes));
       SoapRequest request;

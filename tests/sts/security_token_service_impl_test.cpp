@@ -96,6 +96,14 @@ TEST_F(SecurityTokenServiceImplTest, AnEmptyAssertionGivesNoToken) {
   EXPECT_THAT(log.Lines(), Not(testing::Contains(HasSubstr("Successfully"))));
 }
 
+TEST_F(SecurityTokenServiceImplTest, AFactoryThatMakesNoTokenGivesNone) {
+  factory_->makesNone = true;
+  const LogCapture log(6);
+  EXPECT_EQ(MakeService()->AcquireToken("alice", "pw", OneHour()), nullptr);
+  EXPECT_THAT(factory_->texts, ElementsAre(kCanonicalAssertion));
+  EXPECT_THAT(log.Lines(), IsEmpty());
+}
+
 TEST_F(SecurityTokenServiceImplTest, TracesTheOperation) {
   const LogCapture log(7);
   auto spec = OneHour();

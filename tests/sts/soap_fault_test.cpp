@@ -75,6 +75,18 @@ TEST(SoapFaultTest, CodesOfRejectedCredentials) {
   }
 }
 
+// XML Schema Part 2, section 4.3.6: white space around a QName is not part of it.
+TEST(SoapFaultTest, CodesMayHaveWhiteSpaceAroundThem) {
+  for (const std::string code : {"\n      wst:FailedAuthentication\n    ",
+                                 "wst:FailedAuthentication\t", " wsse:InvalidSecurityToken"}) {
+    EXPECT_EQ(ThrownFor(Envelope(Fault(code, "no entry"))),
+              Expect<InvalidCredentialsException>("Authentication failed: no entry"))
+        << code;
+  }
+  EXPECT_EQ(ThrownFor(Envelope(Fault(" wst:FailedAuthentication ", kExpired))),
+            Expect<PasswordExpiredException>("Authentication failed: " + std::string(kExpired)));
+}
+
 TEST(SoapFaultTest, CodesAreComparedByTheirNamespace) {
   const std::string foreign =
       R"(<faultcode xmlns:f="http://docs.oasis-open.org/ws-sx/ws-trust/200512">)"
@@ -92,7 +104,7 @@ TEST(SoapFaultTest, AnyOtherCodeIsReportedAsReceived) {
   for (const std::string code :
        {"wsse:FailedAuthentication", "S:Server", "wst:InvalidRequest", "wst:failedauthentication",
         "wst:FailedAuthentication2", "FailedAuthentication", "InvalidSecurityToken",
-        "wst:FailedAuthentication ", "wst:a:b"}) {
+        "wst:Failed Authentication", "wst:a:b", " S:Server\n"}) {
     EXPECT_EQ(ThrownFor(Envelope(Fault(code, std::string(kExpired)))),
               Expect<SsoException>("Unexpected SOAP fault: " + code + "; request failed."));
   }
@@ -158,6 +170,36 @@ TEST(SoapFaultTest, TheFaultStringOfARefusedTimestampIsLogged) {
   const std::string line = "4 The service answered with fault `wsse:InvalidSecurity': ";
   EXPECT_EQ(log.Lines(), (std::vector<std::string>{line + "The clock?is ahead",
                                                    line + std::string(1000, 'x') + "..."}));
+}
+
+TEST(SoapFaultTest, TheFaultStringIsLoggedForEveryCodeOfARefusedTimestamp) {
+  const LogCapture log(4);
+  const std::string wsu = R"( xmlns:wsu="http://docs.oasis-open.org/wss/2004/01/)"
+                          R"(oasis-200401-wss-wssecurity-utility-1.0.xsd")";
+  for (const std::string code :
+       {"wsu:MessageExpired", "wsse:MessageExpired", "wsse:InvalidSecurity", "wsu:InvalidSecurity",
+        "wst:MessageExpired", "wsse:messageexpired"}) {
+    const std::string fault = "<faultcode" + wsu + ">" + code + "</faultcode>";
+    EXPECT_EQ(ThrownFor(Envelope(Fault(fault + "<faultstring>late</faultstring>"))),
+              Expect<SsoException>("Unexpected SOAP fault: " + code + "; request failed."));
+  }
+  const std::string line = "4 The service answered with fault `";
+  EXPECT_EQ(log.Lines(), (std::vector<std::string>{line + "wsu:MessageExpired': late",
+                                                   line + "wsse:MessageExpired': late",
+                                                   line + "wsse:InvalidSecurity': late"}));
+}
+
+TEST(SoapFaultTest, ALongFaultCodeIsLoggedInPart) {
+  const LogCapture log(4);
+  const std::string prefix(2000, 'p');
+  const std::string code = prefix + ":InvalidSecurity";
+  EXPECT_EQ(ThrownFor(Envelope(Fault("<faultcode xmlns:" + prefix +
+                                     R"(="http://docs.oasis-open.org/wss/2004/01/)"
+                                     R"(oasis-200401-wss-wssecurity-secext-1.0.xsd">)" +
+                                     code + "</faultcode><faultstring>late</faultstring>"))),
+            Expect<SsoException>("Unexpected SOAP fault: " + code + "; request failed."));
+  EXPECT_EQ(log.Lines(), (std::vector<std::string>{"4 The service answered with fault `" +
+                                                   prefix.substr(0, 1000) + "...': late"}));
 }
 
 }  // namespace

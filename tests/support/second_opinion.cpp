@@ -3,6 +3,7 @@
 #include <cstddef>
 #include <regex>
 #include <string>
+#include <utility>
 
 #include <devsts/xml_security.h>
 
@@ -50,8 +51,12 @@ bool ReplaceMalformedNamespace(std::string& xml, const std::string& error) {
 }  // namespace
 
 std::string SecondOpinionOf(std::string xml) {
+  return SecondOpinionOf(std::move(xml), TrustedCredential().certificatePem);
+}
+
+std::string SecondOpinionOf(std::string xml, const std::string& certificatePem) {
   while (true) {
-    const DevSts::VerifyResult opinion = DevSts::VerifyXml(xml, TrustedCredential().certificatePem);
+    const DevSts::VerifyResult opinion = DevSts::VerifyXml(xml, certificatePem);
     if (opinion) {
       return "";
     }

@@ -12,6 +12,8 @@ namespace SsoClient::Testing {
 /// one. Such a URI is replaced by a valid one before another attempt. That attempt fails, as it
 /// should, if the signature or a name depends on the URI.
 std::string SecondOpinionOf(std::string xml);
+/// The same with the key of another certificate, in PEM.
+std::string SecondOpinionOf(std::string xml, const std::string& certificatePem);
 
 }  // namespace SsoClient::Testing
 

@@ -75,5 +75,23 @@ TEST(ReadAdviceTest, EnforcesTheReadingRules) {
   }
 }
 
+TEST(ReadAdviceTest, ReportsTheFirstOfTwoFaults) {
+  const std::pair<const char*, const char*> cases[] = {
+      {"<saml2:Advice x=\"\"><y/></saml2:Advice>",
+       "Unexpected attributes on element 'saml2:Advice'"},
+      {"<saml2:Advice><rsa:RSAAdvice x=\"\"/></saml2:Advice>",
+       "Node 'rsa:RSAAdvice is missing required attribute 'AdviceSource'"},
+      {"<saml2:Advice><rsa:RSAAdvice AdviceSource=\"s\" x=\"\"><y/></rsa:RSAAdvice></saml2:Advice>",
+       "Unexpected attributes on element 'rsa:RSAAdvice'"},
+      {"<saml2:Advice><rsa:RSAAdvice AdviceSource=\"s\"><saml2:Attribute x=\"\"/>"
+       "</rsa:RSAAdvice><y/></saml2:Advice>",
+       "Node 'saml2:Attribute is missing required attribute 'Name'"}};
+  for (const auto& [content, message] : cases) {
+    Fragment fragment(content);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadAdvice(fragment.Cursor()); }), message)
+        << content;
+  }
+}
+
 }  // namespace
 }  // namespace SsoClient::Testing

@@ -209,6 +209,23 @@ TEST(ReadAssertionTest, RefusesMissingOrBrokenAttributes) {
   }
 }
 
+TEST(ReadAssertionTest, ReportsAMissingAttributeBeforeAnUnexpectedOne) {
+  const std::pair<const char*, const char*> cases[] = {
+      {R"(x="" ID="_a1" IssueInstant="soon")",
+       "Node 'saml2:Assertion is missing required attribute 'Version'"},
+      {R"(x="" IssueInstant="soon" Version="2.0")",
+       "Node 'saml2:Assertion is missing required attribute 'ID'"},
+      {R"(x="" ID="_a1" Version="2.0")",
+       "Node 'saml2:Assertion is missing required attribute 'IssueInstant'"},
+      {R"(x="" ID="_a1" IssueInstant="soon" Version="2.0")",
+       "Unexpected attributes on element 'saml2:Assertion'"}};
+  for (const auto& [attributes, message] : cases) {
+    AssertionText text(kNow);
+    text.attributes = attributes;
+    EXPECT_EQ(Refusal(text.ToXml()), message);
+  }
+}
+
 TEST(ReadAssertionTest, ReportsTheFirstFaultInReadingOrder) {
   AssertionText text(kNow);
   text.subject = "<x/>";

@@ -2,6 +2,7 @@
 
 #include <string>
 #include <tuple>
+#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -91,6 +92,28 @@ TEST(ReadConditionsTest, RefusesEachRestrictionTwice) {
   }
 }
 
+// A restriction with a count of 0 is a restriction that was read.
+TEST(ReadConditionsTest, RefusesASecondRestrictionAfterACountOfZero) {
+  const std::string proxy = Replaced(kProxy, R"("3")", R"("0")");
+  EXPECT_EQ(Read(proxy).proxyCount, 0U);
+  EXPECT_EQ(Refusal(proxy + kProxy), kUnknownOrDuplicate);
+  const std::string renew = Replaced(kRenew, R"("5")", R"("0")");
+  ASSERT_TRUE(Read(renew).renewRestriction.has_value());
+  EXPECT_EQ(Read(renew).renewRestriction->count, 0U);
+  EXPECT_EQ(Refusal(renew + kRenew), kUnknownOrDuplicate);
+}
+
+TEST(ReadConditionsTest, RefusesASecondRestrictionBeforeItsContentIsRead) {
+  const std::pair<const char*, const char*> cases[] = {
+      {kAudiences, "<saml2:AudienceRestriction x=\"\"/>"},
+      {kProxy, "<saml2:ProxyRestriction/>"},
+      {kRenew, R"(<saml2:Condition xsi:type="rsa:RenewRestrictionType"/>)"},
+      {kDelegation, R"(<saml2:Condition xsi:type="del:DelegationRestrictionType"/>)"}};
+  for (const auto& [first, second] : cases) {
+    EXPECT_EQ(Refusal(std::string(first) + second), kUnknownOrDuplicate) << second;
+  }
+}
+
 TEST(ReadConditionsTest, RefusesUnknownNodes) {
   for (const char* restriction :
        {"<saml2:OneTimeUse/>", "text", "<?pi?>", "<ds:ProxyRestriction Count=\"1\"/>",
@@ -124,6 +147,13 @@ TEST(ReadConditionsTest, IdentifiesConditionsByTheTypesExpandedName) {
   ASSERT_TRUE(conditions.renewRestriction.has_value());
   EXPECT_FALSE(conditions.renewRestriction->postdatable);
   EXPECT_FALSE(conditions.renewRestriction->renewExpired);
+}
+
+TEST(ReadConditionsTest, ReadsTheTypeWithoutTheWhiteSpaceAroundIt) {
+  const std::string padded = Replaced(kRenew, "\"rsa:Renew", "\"&#10; rsa:Renew");
+  EXPECT_TRUE(Read(padded).renewRestriction.has_value());
+  EXPECT_EQ(Refusal(padded + kRenew), kUnknownOrDuplicate);
+  EXPECT_EQ(Refusal(Replaced(kRenew, "rsa:Renew", "rsa: Renew")), kUnknownOrDuplicate);
 }
 
 TEST(ReadConditionsTest, RefusesMissingOrBrokenTimes) {
@@ -220,6 +250,84 @@ TEST(ReadConditionsTest, RefusesBrokenDelegationRestriction) {
             "Expected element 'Delegate' not found.");
   EXPECT_EQ(Refusal(Replaced(kDelegation, "RestrictionType\"", "RestrictionType\" Count=\"1\"")),
             "Unexpected attribute 'Count' on element 'saml2:Condition'");
+}
+
+TEST(ReadConditionsTest, ReportsTheFirstOfTwoFaultsInConditions) {
+  const std::string start = R"( NotBefore="2024-03-05T07:00:00Z")";
+  const std::string end = R"( NotOnOrAfter="2024-03-05T08:00:00Z")";
+  const std::pair<std::string, const char*> cases[] = {
+      {"x=\"\"" + end, "Node 'saml2:Conditions is missing required attribute 'NotBefore'"},
+      {"x=\"\"" + start, "Node 'saml2:Conditions is missing required attribute 'NotOnOrAfter'"},
+      {"x=\"\" NotBefore=\"now\"" + end, "Unexpected attributes on element 'saml2:Conditions'"},
+      {R"(NotOnOrAfter="later" NotBefore="now")", "saml2:Conditions/@NotBefore is not a date"},
+      {"NotOnOrAfter=\"later\"" + start, "saml2:Conditions/@NotOnOrAfter is not a date"}};
+  for (const auto& [attributes, message] : cases) {
+    const std::string text = "<saml2:Conditions " + attributes + "><x/></saml2:Conditions>";
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadText(text); }), message);
+  }
+  EXPECT_EQ(Refusal("<saml2:ProxyRestriction/><x/>"),
+            "Node 'saml2:ProxyRestriction is missing required attribute 'Count'");
+  EXPECT_EQ(Refusal("<x/><saml2:ProxyRestriction/>"), kUnknownOrDuplicate);
+}
+
+TEST(ReadConditionsTest, ReportsTheFirstOfTwoFaultsInARestriction) {
+  const std::pair<std::string, const char*> cases[] = {
+      {R"(<saml2:AudienceRestriction><saml2:Audience x=""/></saml2:AudienceRestriction>)",
+       "Unexpected attributes on element 'saml2:Audience'"},
+      {R"(<saml2:AudienceRestriction><saml2:Audience/><x/></saml2:AudienceRestriction>)",
+       "Element 'saml2:Audience' must only have textual content (but has extra children or is "
+       "empty)."},
+      {R"(<saml2:ProxyRestriction x=""/>)",
+       "Node 'saml2:ProxyRestriction is missing required attribute 'Count'"},
+      {R"(<saml2:ProxyRestriction Count="-1" x=""/>)",
+       "Unexpected attributes on element 'saml2:ProxyRestriction'"},
+      {R"(<saml2:ProxyRestriction Count="-1"><x/></saml2:ProxyRestriction>)",
+       "saml2:ProxyRestriction/@Count is not a non-negative integer."},
+      {R"(<saml2:Condition x=""/>)", kUnknownOrDuplicate}};
+  for (const auto& [restriction, message] : cases) {
+    EXPECT_EQ(Refusal(restriction), message) << restriction;
+  }
+}
+
+TEST(ReadConditionsTest, ReportsTheFirstOfTwoFaultsInARenewRestriction) {
+  const std::pair<const char*, const char*> cases[] = {
+      {R"(x="" Postdatable="yes")", "Node 'saml2:Condition is missing required attribute 'Count'"},
+      {R"(Count="-1" x="")", "Unexpected attribute 'x' on element 'saml2:Condition'"},
+      {R"(RenewExpired="no" Postdatable="yes" Count="-1")",
+       "saml2:Condition/@Count is not a non-negative integer."},
+      {R"(RenewExpired="no" Postdatable="yes" Count="1")",
+       "saml2:Condition/@Postdatable is not a Boolean"},
+      {R"(RenewExpired="no" Count="1")", "saml2:Condition/@RenewExpired is not a Boolean"},
+      {R"(Count="-1")", "saml2:Condition/@Count is not a non-negative integer."}};
+  for (const auto& [attributes, message] : cases) {
+    EXPECT_EQ(Refusal(std::string(R"(<saml2:Condition xsi:type="rsa:RenewRestrictionType" )") +
+                      attributes + "><x/></saml2:Condition>"),
+              message)
+        << attributes;
+  }
+}
+
+TEST(ReadConditionsTest, ReportsTheFirstOfTwoFaultsInADelegationRestriction) {
+  const std::string open = R"(<saml2:Condition xsi:type="del:DelegationRestrictionType">)";
+  const std::string close = "</saml2:Condition>";
+  EXPECT_EQ(Refusal(Replaced(open, ">", " x=\"\">") + close),
+            "Unexpected attribute 'x' on element 'saml2:Condition'");
+  const std::string nameId =
+      R"(<saml2:NameID Format="http://schemas.xmlsoap.org/claims/UPN">a@b</saml2:NameID>)";
+  const std::string instant = R"(<del:Delegate DelegationInstant="2024-03-05T07:08:09Z">)";
+  const std::pair<std::string, const char*> cases[] = {
+      {"<del:Delegate x=\"\"/>",
+       "Node 'del:Delegate is missing required attribute 'DelegationInstant'"},
+      {R"(<del:Delegate x="" DelegationInstant="now"/>)",
+       "Unexpected attributes on element 'del:Delegate'"},
+      {"<del:Delegate DelegationInstant=\"now\"/>",
+       "del:Delegate/@DelegationInstant is not a date"},
+      {instant + Replaced(nameId, "a@b", "ab") + "<x/></del:Delegate>",
+       "Failed to parse the UPN NameID: `ab'; name or domain part is missing."},
+      {instant + nameId + "<x/></del:Delegate><y/>", "Element 'del:Delegate' must be empty"}};
+  for (const auto& [content, message] : cases) {
+    EXPECT_EQ(Refusal(open + content + close), message) << content;
+  }
 }
 
 }  // namespace

@@ -164,6 +164,16 @@ TEST(CreateSamlTokenTest, ReadsTheWholeTokenBeforeItChecksValidity) {
             "Unexpected elements under Assertion");
 }
 
+TEST(CreateSamlTokenTest, RefusesAnEmptyIdThatItsReferenceCovers) {
+  AssertionText text;
+  text.attributes = Replaced(text.attributes, "ID=\"_a1\"", "ID=\"\"");
+  text.signature = MadeUpSignature("#");
+  for (const auto& resolver : {Ref<const KeyInfoResolver>(), TrustedResolver()}) {
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { CreateSamlToken(text.ToXml(), resolver.get()); }),
+              "Invalid token ID");
+  }
+}
+
 TEST(CreateSamlTokenTest, ChecksValidityBeforeTheSignature) {
   const auto now = Tarnik::System::GetUtcDateTime();
   const auto longAgo = Tarnik::System::DateTimeFromUtc(now.GetUtcTime() - 7200L * 1'000'000, false);

@@ -27,6 +27,14 @@ TEST(ReadNameIdTest, LeavesAnAbsentFormatEmpty) {
   EXPECT_EQ(ReadNameId(fragment.Cursor(), "Issuer").format, "");
 }
 
+TEST(ReadNameIdTest, KeepsBlanks) {
+  Fragment fragment(R"(<saml2:Issuer Format=" urn:f ">
+ the issuer	</saml2:Issuer>)");
+  const NameId nameId = ReadNameId(fragment.Cursor(), "Issuer");
+  EXPECT_EQ(nameId.format, " urn:f ");
+  EXPECT_EQ(nameId.value, "\n the issuer\t");
+}
+
 TEST(ReadNameIdTest, EnforcesTheReadingRules) {
   const std::pair<const char*, const char*> cases[] = {
       {"", "Expected element 'Issuer' not found."},
@@ -54,6 +62,31 @@ TEST(ReadPrincipalTest, ReadsAUserPrincipalName) {
   const PrincipalId principal = ReadPrincipal(fragment.Cursor());
   EXPECT_EQ(principal.name, "a");
   EXPECT_EQ(principal.domain, "b");
+}
+
+TEST(ReadPrincipalTest, KeepsBlanks) {
+  Fragment fragment(
+      "<saml2:NameID Format=\"http://schemas.xmlsoap.org/claims/UPN\">\n a b @ c "
+      "\t </saml2:NameID>");
+  const PrincipalId principal = ReadPrincipal(fragment.Cursor());
+  EXPECT_EQ(principal.name, "\n a b ");
+  EXPECT_EQ(principal.domain, " c \t ");
+}
+
+TEST(ReadPrincipalTest, ReportsTheFirstOfTwoFaults) {
+  const std::pair<const char*, const char*> cases[] = {
+      {R"(<ds:NameID x=""/>)", "Element 'ds:NameID' has unexpected namespace"},
+      {R"(<saml2:NameID Format="urn:f" x=""/>)", "Unexpected attributes on element 'saml2:NameID'"},
+      {R"(<saml2:NameID Format="urn:f">a<!---->b</saml2:NameID>)",
+       "Element 'saml2:NameID' must only have textual content (but has extra children or is "
+       "empty)."},
+      {R"(<saml2:NameID Format="urn:f">ab</saml2:NameID>)",
+       "Invalid or unsupported NameId format 'urn:f"}};
+  for (const auto& [content, message] : cases) {
+    Fragment fragment(content);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadPrincipal(fragment.Cursor()); }), message)
+        << content;
+  }
 }
 
 TEST(ReadPrincipalTest, RefusesOtherAndMissingFormat) {
@@ -111,9 +144,12 @@ TEST(PrincipalFromNameIdTest, RejectsOtherFormat) {
             "Invalid or unsupported NameId format 'urn:other");
   EXPECT_EQ(ThrownMessage<ParseException>([] { PrincipalFromNameId("", "a@b"); }),
             "Invalid or unsupported NameId format '");
-  EXPECT_EQ(ThrownMessage<ParseException>(
-                [] { PrincipalFromNameId("http://schemas.xmlsoap.org/claims/upn", "a@b"); }),
-            "Invalid or unsupported NameId format 'http://schemas.xmlsoap.org/claims/upn");
+  for (const std::string format :
+       {"http://schemas.xmlsoap.org/claims/upn", "http://schemas.xmlsoap.org/claims/UPN ",
+        "http://schemas.xmlsoap.org/claims/UPN2", "http://schemas.xmlsoap.org/claims/UP"}) {
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { PrincipalFromNameId(format, "a@b"); }),
+              "Invalid or unsupported NameId format '" + format);
+  }
 }
 
 TEST(PrincipalFromNameIdTest, ChecksTheFormatBeforeTheValue) {

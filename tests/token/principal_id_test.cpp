@@ -67,6 +67,16 @@ TEST(PrincipalIdTest, StopsAtTheFirstNul) {
   EXPECT_TRUE(a == b);
 }
 
+TEST(PrincipalIdTest, StopsAtTheFirstNulWhateverFollowsIt) {
+  const PrincipalId plain{"alice", "d"};
+  const PrincipalId longer{std::string("alice\0more", 10), std::string("d\0", 2)};
+  EXPECT_TRUE(plain == longer);
+  EXPECT_TRUE(longer == plain);
+  const PrincipalId empty{std::string("\0alice", 6), ""};
+  EXPECT_TRUE((PrincipalId{"", std::string("\0d", 2)} == empty));
+  EXPECT_FALSE((PrincipalId{std::string("alic\0e", 6), "d"} == plain));
+}
+
 TEST(PrincipalIdTest, FoldsAsciiLettersOnly) {
   EXPECT_FALSE((PrincipalId{"\xC3\x84", "d"} == PrincipalId{"\xC3\xA4", "d"}));
   EXPECT_FALSE((PrincipalId{"a[", "d"} == PrincipalId{"a{", "d"}));

@@ -144,6 +144,14 @@ TEST(SamlTokenImplTest, IsRenewableAndDelegableByCountsOtherThanZero) {
   }
 }
 
+TEST(SamlTokenImplTest, IsRenewableAndDelegableByACountOfOne) {
+  AssertionText text(kNow);
+  text.conditions = Replaced(text.conditions, "Count=\"5\"", "Count=\"01\"");
+  text.conditions = Replaced(text.conditions, "Count=\"10\"", "Count=\"1\"");
+  EXPECT_TRUE(MakeToken(text)->IsRenewable());
+  EXPECT_TRUE(MakeToken(text)->IsDelegable());
+}
+
 TEST(SamlTokenImplTest, IsDelegableWithoutADelegationChain) {
   AssertionText text(kNow);
   const auto chainLength = [](const SamlToken& token) {

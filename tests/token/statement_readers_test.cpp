@@ -45,24 +45,21 @@ TEST(ReadSamlAttributeTest, LeavesAbsentNamesEmpty) {
   EXPECT_TRUE(attribute.values.empty());
 }
 
-TEST(ReadSamlAttributeTest, ReadsEmptyValuesOnlyIfRequested) {
-  const std::string text =
+TEST(ReadSamlAttributeTest, ReadsValuesWithoutContentAsEmptyTexts) {
+  Fragment fragment(
       R"(<saml2:Attribute Name="n"><saml2:AttributeValue xsi:type="xs:string"/>)"
       R"(<saml2:AttributeValue>a</saml2:AttributeValue>)"
-      R"(<saml2:AttributeValue></saml2:AttributeValue></saml2:Attribute>)";
-  Fragment read(text);
-  EXPECT_EQ(ReadSamlAttribute(read.Cursor(), EmptyValues::kRead).values,
-            (std::vector<std::string_view>{"", "a", ""}));
-  Fragment refused(text);
-  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadSamlAttribute(refused.Cursor()); }), kTextOnly);
+      R"(<saml2:AttributeValue></saml2:AttributeValue>)"
+      R"(<saml2:AttributeValue><![CDATA[]]></saml2:AttributeValue></saml2:Attribute>)");
+  EXPECT_EQ(ReadSamlAttribute(fragment.Cursor()).values,
+            (std::vector<std::string_view>{"", "a", "", ""}));
 }
 
 TEST(ReadSamlAttributeTest, TreatsOnlyAValueWithoutContentAsEmpty) {
   for (const char* content : {"<!---->", "<?p?>", "<x/>", "<!---->a"}) {
     Fragment fragment(std::string("<saml2:Attribute Name=\"n\"><saml2:AttributeValue>") + content +
                       "</saml2:AttributeValue></saml2:Attribute>");
-    EXPECT_EQ(ThrownMessage<ParseException>(
-                  [&] { ReadSamlAttribute(fragment.Cursor(), EmptyValues::kRead); }),
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadSamlAttribute(fragment.Cursor()); }),
               kTextOnly)
         << content;
   }
@@ -81,7 +78,6 @@ TEST(ReadSamlAttributeTest, EnforcesTheReadingRules) {
       {open + "<x/>" + close, "Expected element 'AttributeValue' not found."},
       {open + "<AttributeValue>v</AttributeValue>" + close,
        "Element 'AttributeValue' has unexpected namespace"},
-      {open + "<saml2:AttributeValue/>" + close, kTextOnly},
       {open + "<saml2:AttributeValue><x/></saml2:AttributeValue>" + close, kTextOnly},
       {open + "<saml2:AttributeValue>a<!---->b</saml2:AttributeValue>" + close, kTextOnly},
       {open + "<saml2:AttributeValue>a<?p?>b</saml2:AttributeValue>" + close, kTextOnly},
@@ -96,12 +92,31 @@ TEST(ReadSamlAttributeTest, EnforcesTheReadingRules) {
   }
 }
 
-TEST(ReadSamlAttributeTest, RefusesATypeOfAnUndefinedPrefix) {
-  Fragment fragment(
-      "\n<saml2:Attribute Name=\"n\">\n"
-      "<saml2:AttributeValue xsi:type=\"no:string\">v</saml2:AttributeValue></saml2:Attribute>");
-  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadSamlAttribute(fragment.Cursor()); }),
-            "Element saml2:AttributeValueat 3,1 uses undefined prefix: `no'");
+TEST(ReadSamlAttributeTest, DoesNotReadTheTypesOfValues) {
+  for (const char* type : {"xs:string", "string", "no:string", "no:", ":", "", "a:b:c", " x y "}) {
+    Fragment fragment(std::string("<saml2:Attribute Name=\"n\"><saml2:AttributeValue xsi:type=\"") +
+                      type + "\">v</saml2:AttributeValue></saml2:Attribute>");
+    EXPECT_EQ(ReadSamlAttribute(fragment.Cursor()).values, (std::vector<std::string_view>{"v"}))
+        << type;
+  }
+}
+
+TEST(ReadSamlAttributeTest, ReportsTheFirstOfTwoFaults) {
+  const std::pair<const char*, const char*> cases[] = {
+      {R"(<saml2:Attribute x=""/>)", "Node 'saml2:Attribute is missing required attribute 'Name'"},
+      {R"(<saml2:Attribute Name="n" x=""><y/></saml2:Attribute>)",
+       "Unexpected attributes on element 'saml2:Attribute'"},
+      {R"(<saml2:Attribute Name="n"><saml2:AttributeValue x=""><y/></saml2:AttributeValue>)"
+       R"(</saml2:Attribute>)",
+       "Unexpected attribute 'x' on element 'saml2:AttributeValue'"},
+      {R"(<saml2:Attribute Name="n"><saml2:AttributeValue><y/></saml2:AttributeValue><x/>)"
+       R"(</saml2:Attribute>)",
+       kTextOnly}};
+  for (const auto& [content, message] : cases) {
+    Fragment fragment(content);
+    EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadSamlAttribute(fragment.Cursor()); }), message)
+        << content;
+  }
 }
 
 using Values = std::vector<std::string>;
@@ -197,12 +212,16 @@ TEST(ReadAttributeStatementTest, LeavesNamesEmptyWithoutValue) {
 }
 
 TEST(ReadAttributeStatementTest, UsesTheLastNames) {
-  EXPECT_EQ(ReadAttributes(AttributeText(kSurname, {"a"}) + AttributeText(kSurname, {"b", "c"}))
-                .names.surname,
-            "b");
-  EXPECT_EQ(
-      ReadAttributes(AttributeText(kSurname, {"a"}) + AttributeText(kSurname, {})).names.surname,
-      "");
+  const auto names = [](const Values& first, const Values& second) {
+    return ReadAttributes(AttributeText(kGivenName, first) + AttributeText(kSurname, first) +
+                          AttributeText(kGivenName, second) + AttributeText(kSurname, second))
+        .names;
+  };
+  EXPECT_EQ(names({"a"}, {"b", "c"}).givenName, "b");
+  EXPECT_EQ(names({"a"}, {"b", "c"}).surname, "b");
+  // An attribute without values resets the name.
+  EXPECT_EQ(names({"a"}, {}).givenName, "");
+  EXPECT_EQ(names({"a"}, {}).surname, "");
 }
 
 TEST(ReadAttributeStatementTest, IgnoresAttributesOfOtherNames) {
@@ -213,13 +232,29 @@ TEST(ReadAttributeStatementTest, IgnoresAttributesOfOtherNames) {
   EXPECT_EQ(attributes.names.surname, "");
 }
 
-TEST(ReadAttributeStatementTest, RefusesEmptyValues) {
-  for (const std::string name :
-       {kGroupIdentityAttribute, kIsSolutionAttribute, kSurname, "urn:other"}) {
-    EXPECT_EQ(AttributesRefusal(AttributeText(name, {""})),
-              "Element 'saml2:AttributeValue' must only have textual content (but has extra "
-              "children or is empty).");
-  }
+TEST(ReadAttributeStatementTest, ReadsEmptyValuesAsEmptyTexts) {
+  EXPECT_EQ(ReadAttributes(AttributeText(kGivenName, {"Ada"}) + AttributeText(kSurname, {""}))
+                .names.surname,
+            "");
+  EXPECT_EQ(ReadAttributes(AttributeText(kSurname, {"a"}) + AttributeText(kSurname, {"", "b"}))
+                .names.surname,
+            "");
+  EXPECT_EQ(ReadAttributes(AttributeText("urn:other", {"", "a"}) + AttributeText(kSurname, {"b"}))
+                .names.surname,
+            "b");
+}
+
+TEST(ReadAttributeStatementTest, ClearsTheSolutionFlagForAnEmptyValue) {
+  EXPECT_FALSE(ReadAttributes(AttributeText(kIsSolutionAttribute, {"true"}) +
+                              AttributeText(kIsSolutionAttribute, {""}))
+                   .isSolution);
+  EXPECT_EQ(AttributesRefusal(AttributeText(kIsSolutionAttribute, {"true", ""})),
+            "More than one value found for attribute isSolution.");
+}
+
+TEST(ReadAttributeStatementTest, RefusesAGroupWithoutText) {
+  EXPECT_EQ(AttributesRefusal(AttributeText(kGroupIdentityAttribute, {"D\\b", ""})),
+            "Failed to parse Group Identity value: `'; domain or group missing");
 }
 
 TEST(ReadAttributeStatementTest, EnforcesTheReadingRules) {
@@ -234,6 +269,20 @@ TEST(ReadAttributeStatementTest, EnforcesTheReadingRules) {
   Fragment space("<ds:AttributeStatement/>");
   EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadAttributeStatement(space.Cursor()); }),
             "Element 'ds:AttributeStatement' has unexpected namespace");
+}
+
+// Each attribute is applied before the next one is read.
+TEST(ReadAttributeStatementTest, ReportsTheFirstOfTwoFaults) {
+  EXPECT_EQ(AttributesRefusal(AttributeText(kIsSolutionAttribute, {}) + "<x/>"),
+            "No value found for attribute isSolution.");
+  EXPECT_EQ(AttributesRefusal(AttributeText(kGroupIdentityAttribute, {"staff"}) +
+                              AttributeText(kIsSolutionAttribute, {})),
+            "Failed to parse Group Identity value: `staff'; domain or group missing");
+  EXPECT_EQ(AttributesRefusal(AttributeText(kIsSolutionAttribute, {"true", "true", "<x/>"})),
+            kTextOnly);
+  Fragment both("<saml2:AttributeStatement x=\"\"><y/></saml2:AttributeStatement>");
+  EXPECT_EQ(ThrownMessage<ParseException>([&] { ReadAttributeStatement(both.Cursor()); }),
+            "Unexpected attributes on element 'saml2:AttributeStatement'");
 }
 
 // A parsed element without characters has no text child, but an element of a tree that was built
@@ -301,6 +350,42 @@ TEST(ReadAuthnStatementTest, EnforcesTheReadingRules) {
             "Expected element 'AuthnContextClassRef' not found.");
   EXPECT_EQ(AuthnRefusal("<ds:AuthnStatement/>"),
             "Element 'ds:AuthnStatement' has unexpected namespace");
+}
+
+TEST(ReadAuthnStatementTest, RefusesAMissingChild) {
+  EXPECT_EQ(AuthnRefusal(R"(<saml2:AuthnStatement AuthnInstant="2024-03-05T07:08:09Z"/>)"),
+            "Expected element 'AuthnContext' not found.");
+  EXPECT_EQ(AuthnRefusal(R"(<saml2:AuthnStatement AuthnInstant="2024-03-05T07:08:09Z">)"
+                         R"(<saml2:AuthnContext/></saml2:AuthnStatement>)"),
+            "Expected element 'AuthnContextClassRef' not found.");
+}
+
+TEST(ReadAuthnStatementTest, ReportsTheFirstOfTwoFaults) {
+  const std::string good = R"(AuthnInstant="2024-03-05T07:08:09Z")";
+  const std::string context = "<saml2:AuthnContext>";
+  const std::pair<std::string, std::string> attributes[] = {
+      {"x=\"\"", "Node 'saml2:AuthnStatement is missing required attribute 'AuthnInstant'"},
+      {"x=\"\" AuthnInstant=\"now\"", "Unexpected attributes on element 'saml2:AuthnStatement'"},
+      {"AuthnInstant=\"now\"", "saml2:AuthnStatement/@AuthnInstant is not a date"}};
+  for (const auto& [broken, message] : attributes) {
+    EXPECT_EQ(AuthnRefusal("<saml2:AuthnStatement " + broken + "><x/></saml2:AuthnStatement>"),
+              message);
+  }
+  const std::pair<std::string, std::string> contents[] = {
+      {"<saml2:AuthnContext x=\"\"/>", "Unexpected attributes on element 'saml2:AuthnContext'"},
+      {context + "<saml2:AuthnContextClassRef x=\"\"/></saml2:AuthnContext>",
+       "Unexpected attributes on element 'saml2:AuthnContextClassRef'"},
+      {context + "<saml2:AuthnContextClassRef/><x/></saml2:AuthnContext>",
+       "Element 'saml2:AuthnContextClassRef' must only have textual content (but has extra "
+       "children or is empty)."},
+      {context + "<saml2:AuthnContextClassRef>c</saml2:AuthnContextClassRef><x/>"
+                 "</saml2:AuthnContext><y/>",
+       "Unexpected elements after AuthnContextClassRef"}};
+  for (const auto& [broken, message] : contents) {
+    EXPECT_EQ(
+        AuthnRefusal("<saml2:AuthnStatement " + good + ">" + broken + "</saml2:AuthnStatement>"),
+        message);
+  }
 }
 
 }  // namespace

@@ -62,12 +62,20 @@ TEST(ReadSignatureTest, AcceptsOneCoveringReferenceAmongSeveral) {
 
 TEST(ReadSignatureTest, RefusesReferencesToElsewhere) {
   for (const char* uri : {"#other", "#", "_a1", "#_a", "#_a11", "##_a1", "#_A1", "#_a1 ", " #_a1",
-                          "#xpointer(id('_a1'))", "#xpointer(/)", "urn:x#_a1"}) {
+                          "x_a1", "?_a1", "#xpointer(id('_a1'))", "#xpointer(/)", "urn:x#_a1"}) {
     EXPECT_EQ(Refusal(MadeUpSignature(uri)), "Token's signature must cover the entire token")
         << uri;
   }
   EXPECT_EQ(Refusal(WithSecondReference(MadeUpSignature("#other"), "#another")),
             "Token's signature must cover the entire token");
+}
+
+// The reference "#" is "#" followed by the empty id. Such a token is refused for its id.
+TEST(ReadSignatureTest, AcceptsTheEmptyFragmentOnlyForAnEmptyId) {
+  Fragment fragment(MadeUpSignature("#"));
+  EXPECT_NE(ReadSignature(fragment.Cursor(), ""), nullptr);
+  EXPECT_EQ(Refusal(MadeUpSignature("#_a1"), ""), "Token's signature must cover the entire token");
+  EXPECT_EQ(Refusal(MadeUpSignature("#"), "_"), "Token's signature must cover the entire token");
 }
 
 TEST(ReadSignatureTest, RefusesAnythingButAnElementInItsPlace) {

@@ -174,7 +174,8 @@ TEST(CheckValidityTest, RequiresTheDelegateIdOfTheLastDelegate) {
                                 {"second", "D"},
                                 {"secon", "d"},
                                 {"second", ""},
-                                {std::string("second\0", 7), "d"}};
+                                {std::string("second\0", 7), "d"},
+                                {"second", std::string("d\0d", 3)}};
   for (const PrincipalId& other : others) {
     assertion.subject.delegateId = other;
     EXPECT_EQ(Refusal(assertion),

@@ -147,6 +147,19 @@ TEST(IssueBodyTest, APlainSpecGivesTheSixElementsInOrder) {
                                                "<wst:Delegatable>false</wst:Delegatable>"));
 }
 
+TEST(IssueBodyTest, RenewableAndDelegableAreIndependent) {
+  auto spec = PlainSpec();
+  spec.renewable = true;
+  EXPECT_EQ(BodyXml(0, spec), PlainBody("Bearer",
+                                        "<wst:Renewing Allow=\"true\" OK=\"false\"/>"
+                                        "<wst:Delegatable>false</wst:Delegatable>"));
+  spec.renewable = false;
+  spec.delegable = true;
+  EXPECT_EQ(BodyXml(0, spec), PlainBody("Bearer",
+                                        "<wst:Renewing Allow=\"false\" OK=\"false\"/>"
+                                        "<wst:Delegatable>true</wst:Delegatable>"));
+}
+
 TEST(IssueBodyTest, EveryOptionHasItsPlace) {
   auto spec = PlainSpec();
   spec.renewable = true;
@@ -204,9 +217,11 @@ TEST(IssueBodyTest, UseKeyIsLastForKeyTypeOneOnly) {
 
 TEST(IssueBodyTest, ADelegatedTokenHasNoUseKey) {
   auto spec = PlainSpec();
-  spec.delegateTo = "bob";
-  EXPECT_EQ(UseKeyBodyXml(1, spec), BodyXml(1, spec));
-  EXPECT_THAT(UseKeyBodyXml(1, spec), HasSubstr("/PublicKey</wst:KeyType>"));
+  for (const char* name : {"bob", ""}) {
+    spec.delegateTo = std::string(name);
+    EXPECT_EQ(UseKeyBodyXml(1, spec), BodyXml(1, spec));
+    EXPECT_THAT(UseKeyBodyXml(1, spec), HasSubstr("/PublicKey</wst:KeyType>"));
+  }
 }
 
 TEST(IssueBodyTest, UseKeyFollowsAdviceAndParticipants) {

@@ -69,6 +69,19 @@ TEST(OwnIdsTest, AcceptsOtherIdsAndOneCertificate) {
   EXPECT_EQ(ErrorMessage("<a><b><c Id=\"holderOfKeyCertificate\"/></b></a>"), accepted);
   EXPECT_EQ(ErrorMessage("<a Name=\"holderOfKeyProofSignature\">holderOfKeyProofSignature</a>"),
             accepted);
+  for (const char* value : {"holderofkeyproofsignature", "holderOfKeyProofSignature2",
+                            "holderOf KeyProofSignature", "#holderOfKeyProofSignature"}) {
+    EXPECT_EQ(ErrorMessage("<a Id=\"" + std::string(value) + "\"/>"), accepted) << value;
+  }
+  EXPECT_EQ(ErrorMessage("<a identity=\"holderOfKeyProofSignature\"/>"), accepted);
+}
+
+TEST(OwnIdsTest, ExaminesOnlyTheElementThatIsGiven) {
+  const auto document = ParseXml(
+      "<r Id=\"holderOfKeyProofSignature\"><a><b/></a><c Id=\"holderOfKeyProofSignature\"/></r>");
+  EXPECT_NO_THROW(RejectReservedIds(*FindElement(document->RootElement(), "a")));
+  EXPECT_THROW(RejectReservedIds(*FindElement(document->RootElement(), "c")),
+               Tarnik::InvalidArgumentException);
 }
 
 TEST(OwnIdsTest, RefusesTheSignatureIdAnywhere) {
@@ -78,6 +91,9 @@ TEST(OwnIdsTest, RefusesTheSignatureIdAnywhere) {
   for (const char* element :
        {"<c Id=\"holderOfKeyProofSignature\"/>", "<c ID=\"holderOfKeyProofSignature\"/>",
         "<c id=\"holderOfKeyProofSignature\"/>", "<c xml:id=\"holderOfKeyProofSignature\"/>",
+        "<c iD=\"holderOfKeyProofSignature\"/>", "<c Id=\" holderOfKeyProofSignature\"/>",
+        "<c ID=\"&#10;holderOfKeyProofSignature&#9; \"/>",
+        "<c xmlns:p=\"urn:p\" p:iD=\"holderOfKeyProofSignature \"/>",
         "<c xmlns:p=\"urn:p\" a=\"b\" p:Id=\"holderOfKeyProofSignature\"/>"}) {
     EXPECT_EQ(ErrorMessage(element), refused) << element;
     EXPECT_EQ(ErrorMessage("<a>text<b/><b><d/>" + std::string(element) + "</b></a>"), refused)
@@ -90,6 +106,10 @@ TEST(OwnIdsTest, RefusesASecondCertificateId) {
   EXPECT_EQ(
       ErrorMessage("<a><b Id=\"holderOfKeyCertificate\"/><c><d id=\"holderOfKeyCertificate\"/>"
                    "</c></a>"),
+      "A token in the request carries the id 'holderOfKeyCertificate', which is the "
+      "request's own");
+  EXPECT_EQ(
+      ErrorMessage("<a><b Id=\"holderOfKeyCertificate\"/><c iD=\" holderOfKeyCertificate\"/></a>"),
       "A token in the request carries the id 'holderOfKeyCertificate', which is the "
       "request's own");
 }

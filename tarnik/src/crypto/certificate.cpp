@@ -5,11 +5,10 @@
 
 #include <openssl/pem.h>
 
-#include <tarnik/core/object_impl.h>
-#include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/crypto_exception.h>
 
 #include "crypto/certificate_cache.h"
+#include "crypto/certificate_impl.h"
 #include "crypto/load_file.h"
 #include "crypto/pem.h"
 #include "crypto/public_key_impl.h"
@@ -60,8 +59,16 @@ std::string NameText(const X509_NAME* name, const char* part) {
   return length > 0 ? std::string(text, static_cast<std::size_t>(length)) : std::string();
 }
 
+// RFC 5280, section 4.1.2.2 allows 20. The time to convert a number grows with the square of its
+// length, and anyone can send a certificate.
+constexpr int kMaxSerialBytes = 64;
+
 std::string SerialText(const ASN1_INTEGER* serial) {
   const OpenSsl::ErrorScope errors;
+  if (serial != nullptr && ASN1_STRING_length(serial) > kMaxSerialBytes) {
+    throw CryptoException("The certificate's serial number has more than " +
+                          std::to_string(kMaxSerialBytes) + " bytes.");
+  }
   const OpenSsl::OwnedBigNumber number(ASN1_INTEGER_to_BN(serial, nullptr));
   const OpenSsl::OwnedMemory<char> text(number == nullptr ? nullptr : BN_bn2dec(number.get()));
   if (text == nullptr) {
@@ -87,7 +94,7 @@ System::DateTime Time(const ASN1_TIME* time, const char* part) {
                                  false);
 }
 
-std::vector<unsigned char> KeyIdentifier(X509* certificate) {
+std::vector<unsigned char> SubjectKeyIdentifierOf(X509* certificate) {
   const OpenSsl::ErrorScope errors;
   const ASN1_OCTET_STRING* identifier = X509_get0_subject_key_id(certificate);
   if (identifier == nullptr) {
@@ -103,44 +110,46 @@ Ref<const PublicKey> KeyOf(X509* certificate) {
   return key == nullptr ? nullptr : Ref<const PublicKey>(new PublicKeyImpl(std::move(key)));
 }
 
-class CertificateImpl final : public Certificate, public ObjectImpl {
- public:
-  /// `decoded` is the certificate of `der`.
-  CertificateImpl(std::vector<unsigned char> der, X509* decoded);
-
-  const unsigned char* DerBytes() const noexcept override { return der_.data(); }
-  std::size_t DerLength() const noexcept override { return der_.size(); }
-  const std::string& SubjectName() const override { return subjectName_; }
-  const std::string& IssuerName() const override { return issuerName_; }
-  const std::string& SerialNumber() const override { return serialNumber_; }
-  System::DateTime NotBefore() const override { return notBefore_; }
-  System::DateTime NotAfter() const override { return notAfter_; }
-  const std::vector<unsigned char>& SubjectKeyIdentifier() const override {
-    return subjectKeyIdentifier_;
+std::vector<unsigned char> ComputedKeyIdentifier(X509* certificate) {
+  const OpenSsl::ErrorScope errors;
+  std::vector<unsigned char> hash(EVP_MAX_MD_SIZE);
+  unsigned int length = 0;
+  if (X509_pubkey_digest(certificate, EVP_sha1(), hash.data(), &length) != 1) {
+    return {};
   }
-  Ref<const PublicKey> GetPublicKey() const override;
-  std::string ToString() const override;
+  hash.resize(length);
+  return hash;
+}
 
- private:
-  std::vector<unsigned char> der_;
-  std::string subjectName_;
-  std::string issuerName_;
-  std::string serialNumber_;
-  System::DateTime notBefore_;
-  System::DateTime notAfter_;
-  std::vector<unsigned char> subjectKeyIdentifier_;
-  Ref<const PublicKey> publicKey_;  // null when OpenSSL does not know the kind of key
-};
+std::vector<unsigned char> PublicKeyInfo(X509* certificate) {
+  const OpenSsl::ErrorScope errors;
+  unsigned char* bytes = nullptr;
+  const int length = i2d_X509_PUBKEY(X509_get_X509_PUBKEY(certificate), &bytes);
+  const OpenSsl::OwnedMemory<unsigned char> owner(bytes);
+  if (length <= 0) {
+    ThrowBroken(errors, "public key");
+  }
+  return {bytes, bytes + length};
+}
+
+}  // namespace
 
 CertificateImpl::CertificateImpl(std::vector<unsigned char> der, X509* decoded)
     : der_(std::move(der)),
       subjectName_(NameText(X509_get_subject_name(decoded), "subject name")),
       issuerName_(NameText(X509_get_issuer_name(decoded), "issuer name")),
+      subject_(X509_get_subject_name(decoded)),
+      issuer_(X509_get_issuer_name(decoded)),
       serialNumber_(SerialText(X509_get0_serialNumber(decoded))),
       notBefore_(Time(X509_get0_notBefore(decoded), "start of validity")),
       notAfter_(Time(X509_get0_notAfter(decoded), "end of validity")),
-      subjectKeyIdentifier_(KeyIdentifier(decoded)),
+      subjectKeyIdentifier_(SubjectKeyIdentifierOf(decoded)),
+      computedKeyIdentifier_(subjectKeyIdentifier_.empty() ? ComputedKeyIdentifier(decoded)
+                                                           : std::vector<unsigned char>()),
+      keyInfo_(PublicKeyInfo(decoded)),
       publicKey_(KeyOf(decoded)) {}
+
+CertificateImpl::~CertificateImpl() = default;
 
 Ref<const PublicKey> CertificateImpl::GetPublicKey() const {
   if (publicKey_ == nullptr) {
@@ -152,8 +161,6 @@ Ref<const PublicKey> CertificateImpl::GetPublicKey() const {
 std::string CertificateImpl::ToString() const {
   return "Certificate of " + subjectName_;
 }
-
-}  // namespace
 
 Ref<const Certificate> CreateCertificateFromDer(const unsigned char* bytes, std::size_t length) {
   if (bytes == nullptr) {

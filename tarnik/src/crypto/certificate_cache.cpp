@@ -9,6 +9,8 @@ namespace Tarnik::Crypto {
 namespace {
 
 constexpr std::size_t kProcessCapacity = 256;
+// Usual certificates have 1 to 4 KiB. Anyone can send larger ones, which would stay in memory.
+constexpr std::size_t kMaxKeptBytes = std::size_t{16} * 1024;
 
 std::string_view BytesOf(const Certificate& certificate) noexcept {
   return {reinterpret_cast<const char*>(certificate.DerBytes()), certificate.DerLength()};
@@ -27,6 +29,9 @@ Ref<const Certificate> CertificateCache::Find(std::string_view der) {
 }
 
 void CertificateCache::Add(const Ref<const Certificate>& certificate) {
+  if (certificate->DerLength() > kMaxKeptBytes) {
+    return;
+  }
   // Destroyed after the lock is released.
   Order removed;
   const std::lock_guard lock(ObjectLock(this));

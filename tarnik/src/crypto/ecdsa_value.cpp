@@ -32,11 +32,12 @@ std::vector<unsigned char> Encode(const ECDSA_SIG* signature) {
 
 std::vector<unsigned char> DerFromRawEcdsa(const std::vector<unsigned char>& value,
                                            std::size_t orderLength) {
-  if (value.size() != 2 * orderLength) {
+  if (value.size() % 2 != 0 || value.size() > 2 * orderLength) {
     return {};
   }
-  OpenSsl::OwnedBigNumber r = NumberFrom(value.data(), orderLength);
-  OpenSsl::OwnedBigNumber s = NumberFrom(value.data() + orderLength, orderLength);
+  const std::size_t half = value.size() / 2;
+  OpenSsl::OwnedBigNumber r = NumberFrom(value.data(), half);
+  OpenSsl::OwnedBigNumber s = NumberFrom(value.data() + half, half);
   if (BN_is_zero(r.get()) || BN_is_zero(s.get())) {
     return {};
   }

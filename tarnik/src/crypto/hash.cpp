@@ -40,4 +40,13 @@ const EVP_MD* FetchedHash(Hash hash) {
   return added;
 }
 
+std::vector<unsigned char> HashOf(Hash hash, const unsigned char* bytes, std::size_t length) {
+  const OpenSsl::ErrorScope errors;
+  std::vector<unsigned char> value(HashLength(hash));
+  if (EVP_Digest(bytes, length, value.data(), nullptr, FetchedHash(hash), nullptr) != 1) {
+    throw CryptoException(errors.Describe("The digest cannot be computed"));
+  }
+  return value;
+}
+
 }  // namespace Tarnik::Crypto

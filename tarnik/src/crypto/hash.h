@@ -3,6 +3,7 @@
 
 #include <array>
 #include <cstddef>
+#include <vector>
 
 #include "support/openssl.h"
 
@@ -21,6 +22,9 @@ inline constexpr std::size_t kMaxHashLength = 64;
 /// name costs more than hashing a few hundred bytes. Throws `CryptoException` when OpenSSL does not
 /// provide it.
 const EVP_MD* FetchedHash(Hash hash);
+
+/// The hash of `bytes`. Throws `CryptoException` when it cannot be computed.
+std::vector<unsigned char> HashOf(Hash hash, const unsigned char* bytes, std::size_t length);
 
 }  // namespace Tarnik::Crypto
 

@@ -1,5 +1,7 @@
+#include <cerrno>
 #include <cstdio>
 #include <string_view>
+#include <system_error>
 
 #include <openssl/err.h>
 #include <openssl/ui.h>
@@ -84,16 +86,12 @@ OpenSsl::OwnedKey OnlyKeyOf(OSSL_STORE_CTX* store, const std::string& scheme) {
   return found;
 }
 
-// The path of a URI of a local file (RFC 8089, section 2), as OpenSSL reads it, or nothing.
-std::string PathOf(const std::string& uri) {
-  constexpr std::string_view kScheme = "file:";
+// The path of a URI of a local file (RFC 8089, section 2) whose scheme is `scheme`, as OpenSSL
+// reads it. Empty if the URI names a file of another host.
+std::string PathOf(const std::string& uri, const std::string& scheme) {
   constexpr std::string_view kLocalHost = "//localhost/";
-  std::string_view rest(uri);
-  if (!EqualsIgnoringCase(rest.substr(0, kScheme.size()), kScheme)) {
-    return "";
-  }
-  rest.remove_prefix(kScheme.size());
-  if (rest.substr(0, kLocalHost.size()) == kLocalHost) {
+  const std::string_view rest = std::string_view(uri).substr(scheme.size());
+  if (EqualsIgnoringCase(rest.substr(0, kLocalHost.size()), kLocalHost)) {
     return std::string(rest.substr(kLocalHost.size() - 1));
   }
   if (rest.substr(0, 3) == "///") {
@@ -107,19 +105,40 @@ bool IsFolder(std::FILE* file) {
   return fstat(fileno(file), &status) == 0 && S_ISDIR(status.st_mode);
 }
 
-// OpenSSL opens files in descriptors that child processes inherit, so a file is opened here. The
+[[noreturn]] void ThrowNoFile(const std::string& scheme, const std::string& reason) {
+  throw CryptoException("The URI " + Quote(scheme) + " gives no private key: " + reason + ".");
+}
+
+// OpenSSL opens files in descriptors that child processes inherit, so files are opened here. The
 // store reads the source, which must outlive it.
-OpenSsl::OwnedBio OpenSource(const std::string& uri) {
-  const std::string path = PathOf(uri);
-  System::OwnedFile file = path.empty() ? nullptr : System::OpenForReading(path);
-  if (file == nullptr || IsFolder(file.get())) {
-    return nullptr;
+OpenSsl::OwnedBio OpenFile(const std::string& uri, const std::string& scheme,
+                           const OpenSsl::ErrorScope& errors) {
+  const std::string path = PathOf(uri, scheme);
+  if (path.empty()) {
+    ThrowNoFile(scheme, "it names no file of this machine");
+  }
+  System::OwnedFile file = System::OpenForReading(path);
+  if (file == nullptr) {
+    ThrowNoFile(scheme, std::generic_category().message(errno));
+  }
+  if (IsFolder(file.get())) {
+    ThrowNoFile(scheme, "it names a folder");
   }
   OpenSsl::OwnedBio source(BIO_new_fp(file.get(), BIO_CLOSE));
-  if (source != nullptr) {
-    static_cast<void>(file.release());
+  if (source == nullptr) {
+    throw CryptoException(errors.Describe("The private key file cannot be read"));
   }
+  static_cast<void>(file.release());
   return source;
+}
+
+// Whatever the scheme, OpenSSL first looks for a file whose path is the whole URI. Such a file in
+// the working folder must not take the place of a device.
+void RequireNoFile(const std::string& uri, const std::string& scheme) {
+  struct stat status {};
+  if (stat(uri.c_str(), &status) == 0) {
+    ThrowNoFile(scheme, "a file has the URI as its name");
+  }
 }
 
 OpenSsl::OwnedStore OpenStore(const std::string& uri, BIO* source, const UI_METHOD* method,
@@ -132,6 +151,16 @@ OpenSsl::OwnedStore OpenStore(const std::string& uri, BIO* source, const UI_METH
                                                 nullptr, nullptr, nullptr));
 }
 
+// Null if the URI names no file but, for example, a device.
+OpenSsl::OwnedBio OpenSource(const std::string& uri, const std::string& scheme,
+                             const OpenSsl::ErrorScope& errors) {
+  if (EqualsIgnoringCase(scheme, "file:")) {
+    return OpenFile(uri, scheme, errors);
+  }
+  RequireNoFile(uri, scheme);
+  return nullptr;
+}
+
 }  // namespace
 
 Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
@@ -140,7 +169,7 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string& uri,
   const OpenSsl::ErrorScope errors;
   Passphrase asked(passphrase);
   const OwnedUiMethod method = CreateUiMethod(errors);
-  const OpenSsl::OwnedBio source = OpenSource(uri);
+  const OpenSsl::OwnedBio source = OpenSource(uri, scheme, errors);
   const OpenSsl::OwnedStore store = OpenStore(uri, source.get(), method.get(), asked);
   OpenSsl::OwnedKey key;
   if (store != nullptr && OSSL_STORE_expect(store.get(), OSSL_STORE_INFO_PKEY) == 1) {

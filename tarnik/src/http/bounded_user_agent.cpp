@@ -150,15 +150,29 @@ class CallLimitImpl final : public CallLimit, public ObjectImpl {
   std::vector<Ref<BoundedExchange>> underWay_;  // under `ObjectLock(this)`
 };
 
+// What `failure` says to the caller of a bounded agent if `limit` caused it; null otherwise.
+const char* CauseOf(const CallLimitImpl& limit, const Exception& failure) noexcept {
+  if (dynamic_cast<const TimeoutException*>(&failure) != nullptr && limit.HasPassed()) {
+    return kDeadlinePassed;
+  }
+  const bool isCancelled = dynamic_cast<const CancelledException*>(&failure) != nullptr &&
+                           limit.IsCancelled() && !HasProcessEndBegun();
+  return isCancelled ? kCancelled : nullptr;
+}
+
 // `failure` as the caller of a bounded agent sees it.
 std::shared_ptr<Exception> Translate(const CallLimitImpl& limit,
                                      const Exception& failure) noexcept {
-  if (dynamic_cast<const TimeoutException*>(&failure) == nullptr || !limit.HasPassed()) {
+  const char* const cause = CauseOf(limit, failure);
+  if (cause == nullptr) {
     return CopyException(failure);
   }
   try {
-    return std::make_shared<TimeoutException>(std::string(kDeadlinePassed) + " " +
-                                              failure.Message());
+    const std::string message = std::string(cause) + " " + failure.Message();
+    if (cause == kCancelled) {
+      return std::make_shared<CancelledException>(message);
+    }
+    return std::make_shared<TimeoutException>(message);
   } catch (const std::bad_alloc&) {
     return CopyException(failure);
   }
@@ -205,8 +219,11 @@ class BoundedUserAgent final : public UserAgent, public ObjectImpl {
     std::shared_ptr<Exception> failure;
     try {
       return inner_->Wait(innerItem, timeoutMicroseconds);
-    } catch (const TimeoutException& timeout) {
-      failure = Translate(*limit_, timeout);
+    } catch (const IOException& cut) {
+      if (CauseOf(*limit_, cut) == nullptr) {
+        throw;
+      }
+      failure = Translate(*limit_, cut);
     }
     failure->Throw();
     return nullptr;

@@ -1,6 +1,7 @@
 #include "system/pool_core.h"
 
 #include <algorithm>
+#include <atomic>
 #include <deque>
 #include <future>
 
@@ -22,24 +23,40 @@ constexpr std::size_t kMaxLookups = 16;
 constexpr std::chrono::seconds kIdleLimit{10};
 constexpr std::chrono::milliseconds kExitLimit{200};
 
+using IoContexts = std::vector<std::unique_ptr<boost::asio::io_context>>;
+
+// Of an I/O thread.
 thread_local const PoolCore* ownCore = nullptr;
+thread_local boost::asio::io_context* ownContext = nullptr;
 
 std::unique_ptr<boost::asio::io_context> MakeIoContext() {
+  constexpr int kThreads = 1;
+  auto ioContext = std::make_unique<boost::asio::io_context>(kThreads);
+  // Asio opens its descriptors for the first timer and socket.
+  const boost::asio::steady_timer timer(*ioContext);
+  const boost::asio::ip::tcp::socket socket(*ioContext);
+  return ioContext;
+}
+
+// At least one, and more as far as there are descriptors.
+IoContexts MakeIoContexts() {
+  IoContexts ioContexts;
   try {
-    auto ioContext = std::make_unique<boost::asio::io_context>(static_cast<int>(kIoThreads));
-    // Asio opens its descriptors for the first timer and socket.
-    const boost::asio::steady_timer timer(*ioContext);
-    const boost::asio::ip::tcp::socket socket(*ioContext);
-    return ioContext;
+    while (ioContexts.size() < kIoThreads) {
+      ioContexts.push_back(MakeIoContext());
+    }
   } catch (const boost::system::system_error& error) {
-    throw ResourceException("Cannot start the thread pool: " + error.code().message() + ".");
+    if (ioContexts.empty()) {
+      throw ResourceException("Cannot start the thread pool: " + error.code().message() + ".");
+    }
   }
+  return ioContexts;
 }
 
 }  // namespace
 
 PoolCore::PoolCore()
-    : ioContext_(MakeIoContext()),
+    : ioContexts_(MakeIoContexts()),
       workers_("tarnik-worker", ThreadPool::kMaxWorkers, kIdleLimit),
       lookups_("tarnik-lookup", kMaxLookups, kIdleLimit) {}
 
@@ -47,16 +64,27 @@ PoolCore::~PoolCore() = default;
 
 void PoolCore::Start() {
   const std::lock_guard lock(mutex_);
-  for (; ioThreads_ < kIoThreads; ++ioThreads_) {
+  for (; ioThreads_ < ioContexts_.size(); ++ioThreads_) {
     try {
-      StartPoolThread("tarnik-io", [this] { IoLoop(); });
+      StartPoolThread("tarnik-io",
+                      [this, &context = *ioContexts_[ioThreads_]] { IoLoop(context); });
     } catch (...) {
       if (ioThreads_ == 0) {
         throw;
       }
-      return;
+      // Nothing may wait for a thread that does not exist.
+      ioContexts_.resize(ioThreads_);
     }
   }
+}
+
+boost::asio::io_context& PoolCore::IoContext() noexcept {
+  if (ownCore == this) {
+    return *ownContext;
+  }
+  static std::atomic<std::size_t> threads{0};
+  thread_local const std::size_t number = threads.fetch_add(1, std::memory_order_relaxed);
+  return *ioContexts_[number % ioContexts_.size()];
 }
 
 void PoolCore::Freeze() {
@@ -66,7 +94,9 @@ void PoolCore::Freeze() {
     return std::max(std::chrono::duration_cast<std::chrono::milliseconds>(end - Clock::now()),
                     std::chrono::milliseconds(0));
   };
-  ioContext_->stop();
+  for (const auto& ioContext : ioContexts_) {
+    ioContext->stop();
+  }
   lookups_.Freeze(std::chrono::milliseconds(0));
   workers_.Freeze(std::chrono::milliseconds(0));
   const std::future<void> isQueueDropped = DropQueue();
@@ -91,11 +121,12 @@ std::future<void> PoolCore::DropQueue() {
   return isDone;
 }
 
-void PoolCore::IoLoop() {
+void PoolCore::IoLoop(boost::asio::io_context& ioContext) {
   ownCore = this;
+  ownContext = &ioContext;
   const boost::asio::executor_work_guard<boost::asio::io_context::executor_type> untilStopped(
-      ioContext_->get_executor());
-  ioContext_->run();
+      ioContext.get_executor());
+  ioContext.run();
   {
     const std::lock_guard lock(mutex_);
     --ioThreads_;

@@ -8,6 +8,7 @@
 #include <future>
 #include <memory>
 #include <mutex>
+#include <vector>
 
 #include "system/worker_set.h"
 
@@ -29,9 +30,12 @@ class PoolCore {
   PoolCore& operator=(const PoolCore&) = delete;
 
   /// Starts the I/O threads. One is enough; throws `ResourceException` when not even one can start.
+  /// Called once, before the core is used.
   void Start();
 
-  boost::asio::io_context& IoContext() noexcept { return *ioContext_; }
+  /// The context of the calling I/O thread. Every other thread always gets the same one of them, so
+  /// that what it starts for one connection runs on one I/O thread.
+  boost::asio::io_context& IoContext() noexcept;
   WorkerSet& Workers() noexcept { return workers_; }
   WorkerSet& Lookups() noexcept { return lookups_; }
 
@@ -39,11 +43,13 @@ class PoolCore {
   void Freeze();
 
  private:
-  void IoLoop();
+  void IoLoop(boost::asio::io_context& ioContext);
   void WaitForIoThreads(std::chrono::milliseconds limit);
   std::future<void> DropQueue();
 
-  const std::unique_ptr<boost::asio::io_context> ioContext_;
+  // One for each I/O thread. Two threads with a common context would wake each other for every
+  // handler.
+  std::vector<std::unique_ptr<boost::asio::io_context>> ioContexts_;
   WorkerSet workers_;
   WorkerSet lookups_;
 

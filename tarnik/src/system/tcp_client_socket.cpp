@@ -42,7 +42,7 @@ class TCPClientSocketImpl final : public TCPClientSocket,
                                   public ObjectImpl {
  public:
   TCPClientSocketImpl(ThreadPoolImpl& pool, ConnectRules rules)
-      : pool_(&pool), rules_(std::move(rules)), socket_(pool.IoContext()) {}
+      : pool_(&pool), ioContext_(pool.IoContext()), rules_(std::move(rules)), socket_(ioContext_) {}
 
   void ConnectAsync(const std::string& host, int port, ConnectCompletion completion) override;
   void ReadAsync(char* buffer, std::size_t size, ReadCompletion completion) override;
@@ -73,6 +73,8 @@ class TCPClientSocketImpl final : public TCPClientSocket,
   void EndWrite(Exception* error);
 
   const Ref<ThreadPoolImpl> pool_;
+  // All handlers use one context, so that they run on one I/O thread.
+  boost::asio::io_context& ioContext_;
   const ForkMark mark_;
   const ConnectRules rules_;
   mutable std::mutex mutex_;
@@ -128,7 +130,7 @@ void TCPClientSocketImpl::ConnectAsync(const std::string& host, int port,
   std::string peer = DescribeEndpoint(host, port);
   PeerFailures failures(peer);
   const auto race =
-      MakeRef<ConnectRace>(pool_->IoContext(), rules_.attemptDelay,
+      MakeRef<ConnectRace>(ioContext_, rules_.attemptDelay,
                            [self = Self(this)](TCPSocket& winner, const error_code& error) {
                              self->OnConnected(winner, error);
                            });
@@ -184,7 +186,7 @@ void TCPClientSocketImpl::EndLookUp(HostAddresses found) noexcept {
     const std::lock_guard lock(mutex_);
     found_ = std::move(found);
   }
-  boost::asio::post(pool_->IoContext(),
+  boost::asio::post(ioContext_,
                     WithMemory(lookUpMemory_, [self = Self(this)] { self->OnLookedUp(); }));
 }
 
@@ -274,7 +276,7 @@ void TCPClientSocketImpl::ReadAsync(char* buffer, std::size_t size, ReadCompleti
   reading_ = true;
   readCompletion_ = std::move(completion);
   if (closed_) {
-    boost::asio::post(pool_->IoContext(),
+    boost::asio::post(ioContext_,
                       WithMemory(readMemory_, [self = Self(this)] { self->OnRead({}, 0); }));
     return;
   }
@@ -317,7 +319,7 @@ void TCPClientSocketImpl::WriteAsync(const char* data, std::size_t size,
   unwrittenSize_ = size;
   writeCompletion_ = std::move(completion);
   if (closed_ || size == 0) {
-    boost::asio::post(pool_->IoContext(),
+    boost::asio::post(ioContext_,
                       WithMemory(writeMemory_, [self = Self(this)] { self->OnWritten({}, 0); }));
     return;
   }
@@ -391,7 +393,7 @@ void TCPClientSocketImpl::Close() noexcept {
 
 void TCPClientSocketImpl::CancelConnect() noexcept {
   phase_ = Phase::kFailed;
-  boost::asio::post(pool_->IoContext(), WithMemory(closeMemory_, [self = Self(this)] {
+  boost::asio::post(ioContext_, WithMemory(closeMemory_, [self = Self(this)] {
                       CancelledException cancelled = self->failures_.closed;
                       if (const auto completion = self->TakeConnectCompletion()) {
                         completion(self.get(), &cancelled);

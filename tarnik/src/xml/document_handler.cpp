@@ -110,7 +110,8 @@ void DocumentHandler::StartElement(const Position& position, std::string_view na
                             position);
   }
   FlushText();
-  ElementNode* element = TreeBuilder::NewElement(*tree_, Intern(name, position));
+  const InternedName* elementName = Intern(name, position);
+  ElementNode* element = TreeBuilder::NewElement(*tree_, elementName);
   ++depth_;
   if (count > 0) {
     TreeBuilder::ReserveAttributes(*element, *tree_, count);
@@ -126,10 +127,10 @@ void DocumentHandler::StartElement(const Position& position, std::string_view na
       prefixed = prefixed || attributeName->prefixLength != 0;
     }
   }
-  if (element->Prefix() == "xmlns") {
+  if (elementName->Prefix() == "xmlns") {
     throw XMLParseException("The prefix 'xmlns' is not for elements", position);
   }
-  Resolve(element->Prefix(), position);
+  Resolve(elementName->Prefix(), position);
   if (prefixed) {
     CheckAttributeNames(*element, position);
   }
@@ -144,7 +145,7 @@ void DocumentHandler::EndElement(const Position&) {
   FlushText();
   scope_.PopTo(depth_);
   --depth_;
-  openAttributes_ -= static_cast<const ElementNode*>(current_)->AttributeCount();
+  openAttributes_ -= TreeBuilder::AttributeCountOf(static_cast<const ElementNode&>(*current_));
   current_ = current_->Parent();
 }
 
@@ -241,13 +242,14 @@ std::string_view DocumentHandler::Resolve(std::string_view prefix, const Positio
 // are in no namespace, and the parser itself rejects duplicates of them.
 void DocumentHandler::CheckAttributeNames(const ElementNode& element, const Position& position) {
   expandedNames_.clear();
-  for (std::size_t index = 0; index < element.AttributeCount(); ++index) {
-    const InternedName& name = TreeBuilder::NameOf(element.AttributeAt(index));
+  const Attribute* const attributes = TreeBuilder::AttributesOf(element);
+  for (std::size_t index = 0; index < TreeBuilder::AttributeCountOf(element); ++index) {
+    const InternedName& name = TreeBuilder::NameOf(attributes[index]);
     if (name.prefixLength != 0 && !name.isDeclaration) {
       expandedNames_.push_back({Resolve(name.Prefix(), position), name.Local()});
     }
   }
-  if (HasDuplicate()) {
+  if (expandedNames_.size() > 1 && HasDuplicate()) {
     throw XMLParseException("Two attributes of element " +
                                 QuoteVerbatim(element.QualifiedNameText()) +
                                 " have the same name in one namespace",

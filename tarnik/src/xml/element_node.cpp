@@ -67,7 +67,10 @@ std::optional<std::string_view> ElementNode::LookupNamespace(
   if (prefix == "xml") {
     return kXmlNamespace;
   }
-  for (const ElementNode* element = this; element != nullptr; element = element->ParentElement()) {
+  // The parent of an element is an element or the document.
+  for (const Node* node = this; node != nullptr && node->kind_ == NodeKind::kElement;
+       node = node->parent_) {
+    const auto* element = static_cast<const ElementNode*>(node);
     if (element->declaresNamespaces_ == 0) {
       continue;
     }

@@ -1,44 +1,16 @@
 #include "xml/xml_chars.h"
 
-#include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <iterator>
+
+#include "xml/name_chars.h"
 
 namespace Tarnik::Xml {
 
 namespace {
 
 constexpr char32_t kInvalid = 0xFFFFFFFF;
-
-struct Range {
-  char32_t first;
-  char32_t last;
-};
-
-// XML 1.0, fifth edition, production 4, without the colon.
-constexpr Range kNameStart[] = {
-    {'A', 'Z'},       {'_', '_'},       {'a', 'z'},       {0xC0, 0xD6},     {0xD8, 0xF6},
-    {0xF8, 0x2FF},    {0x370, 0x37D},   {0x37F, 0x1FFF},  {0x200C, 0x200D}, {0x2070, 0x218F},
-    {0x2C00, 0x2FEF}, {0x3001, 0xD7FF}, {0xF900, 0xFDCF}, {0xFDF0, 0xFFFD}, {0x10000, 0xEFFFF},
-};
-// Production 4a: the further characters that may follow.
-constexpr Range kNameRest[] = {
-    {'-', '.'}, {'0', '9'}, {0xB7, 0xB7}, {0x300, 0x36F}, {0x203F, 0x2040},
-};
-
-template <std::size_t size>
-bool Holds(const Range (&ranges)[size], char32_t character) noexcept {
-  return std::any_of(std::begin(ranges), std::end(ranges), [character](const Range& range) {
-    return range.first <= character && character <= range.last;
-  });
-}
-
-bool IsNameStart(char32_t character) noexcept {
-  const char32_t letter = character | 0x20;
-  return (letter >= 'a' && letter <= 'z') || Holds(kNameStart, character);
-}
 
 char32_t Continuation(std::string_view text, std::size_t index) noexcept {
   if (index >= text.size()) {
@@ -112,8 +84,7 @@ bool IsNCName(std::string_view name) noexcept {
     return false;
   }
   while (!name.empty()) {
-    const char32_t character = TakeCharacter(name);
-    if (!IsNameStart(character) && !Holds(kNameRest, character)) {
+    if (!IsNameCharacter(TakeCharacter(name))) {
       return false;
     }
   }

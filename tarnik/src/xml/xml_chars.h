@@ -8,8 +8,8 @@ namespace Tarnik::Xml {
 /// True when `text` is UTF-8 and all its characters are allowed in XML 1.0 (section 2.2).
 bool IsXmlText(std::string_view text) noexcept;
 
-/// True for a name without a colon (Namespaces in XML 1.0, section 3; the characters of XML 1.0,
-/// fifth edition, section 2.3).
+/// True for a name without a colon (Namespaces in XML 1.0, section 3), which the parser can read:
+/// its characters are those of XML 1.0, fourth edition.
 bool IsNCName(std::string_view name) noexcept;
 
 /// True for "local" and "prefix:local" with NCNames (Namespaces in XML 1.0, section 4).

@@ -30,8 +30,49 @@ namespace {
 
 static_assert(sizeof(XML_Char) == 1, "Expat must be built for UTF-8");
 
-// The size of a usual security token. Expat adds 1 KiB and rounds up to a power of two.
-constexpr std::size_t kFirstChunkBytes = std::size_t{7} * 1024;
+// Nearly all documents fit into the first piece. Expat scans every piece but the last once more,
+// for a position that is not used here.
+constexpr std::size_t kFirstPieceBytes = std::size_t{128} * 1024;
+// The size of a usual security token.
+constexpr std::size_t kUsualBytes = std::size_t{8} * 1024;
+
+// A piece of a document, which is cleansed.
+class Piece {
+ public:
+  Piece() : bytes_(new char[kUsualBytes]) {}
+  // All of it, since a reader may have written something before it threw.
+  ~Piece() { explicit_bzero(bytes_.get(), capacity_); }
+  Piece(const Piece&) = delete;
+  Piece& operator=(const Piece&) = delete;
+
+  // Reads `size` bytes, or fewer when the reader ends.
+  void Fill(Reader& reader, std::size_t size) {
+    while (filled_ < size) {
+      if (filled_ == capacity_) {
+        Enlarge(std::min(2 * capacity_, size));
+      }
+      const std::size_t count = reader.Read(bytes_.get() + filled_, capacity_ - filled_);
+      if (count == 0) {
+        return;
+      }
+      filled_ += count;
+    }
+  }
+  std::string_view Text() const noexcept { return {bytes_.get(), filled_}; }
+
+ private:
+  void Enlarge(std::size_t capacity) {
+    std::unique_ptr<char[]> larger(new char[capacity]);
+    std::memcpy(larger.get(), bytes_.get(), filled_);
+    explicit_bzero(bytes_.get(), filled_);
+    bytes_.swap(larger);
+    capacity_ = capacity;
+  }
+
+  std::unique_ptr<char[]> bytes_;
+  std::size_t capacity_ = kUsualBytes;
+  std::size_t filled_ = 0;
+};
 
 struct Salt {
   std::uint8_t bytes[16];
@@ -111,7 +152,7 @@ class ExpatSession {
   // Where the event before the current one begins.
   std::int64_t locatedByte_ = 0;
   std::int64_t lineStartByte_ = 0;
-  // The next line feed of the chunk, cached to avoid a search for each event.
+  // The next line feed of the piece, cached to avoid a search for each event.
   std::int64_t lineFeedByte_ = kUnknown;
   Position located_{1, 1};
 };
@@ -169,7 +210,7 @@ void ExpatSession::ParseBuffer(std::size_t size, bool last) {
     ThrowSyntaxError();
   }
   if (!last) {
-    // The next chunk removes everything before the incomplete token from the buffer.
+    // The next piece removes everything before the incomplete token from the buffer.
     Locate();
   }
 }
@@ -314,31 +355,29 @@ class XMLParserImpl final : public XMLParser, public ObjectImpl {
     const Ref<XMLHandler> handler = std::move(handler_);
     const Ref<Reader> reader = std::move(reader_);
     ExpatSession session(*handler);
-    // Each chunk is as long as all previous ones together. Expat scans an incomplete token again
-    // with the next chunk, so chunks of equal length would make long tokens take quadratic time.
-    std::size_t chunkBytes = kFirstChunkBytes;
+    // Each piece is as long as all previous ones together. Expat scans an incomplete token again
+    // with the next piece, so pieces of equal length would make long tokens take quadratic time.
+    std::size_t pieceBytes = kFirstPieceBytes;
     std::size_t total = 0;
-    for (bool last = false; !last; chunkBytes = std::max(chunkBytes, total)) {
-      char* chunk = session.Buffer(chunkBytes);
-      const std::size_t filled = Fill(*reader, chunk, chunkBytes);
+    for (bool last = false; !last; pieceBytes = std::max(pieceBytes, total)) {
+      const std::size_t filled = Feed(session, pieceBytes, *reader);
       total += filled;
-      last = filled < chunkBytes;
+      last = filled < pieceBytes;
       session.ParseBuffer(filled, last);
     }
     return handler->EndDocument();
   }
 
  private:
-  static std::size_t Fill(Reader& reader, char* buffer, std::size_t size) {
-    std::size_t filled = 0;
-    while (filled < size) {
-      const std::size_t count = reader.Read(buffer + filled, size - filled);
-      if (count == 0) {
-        break;
-      }
-      filled += count;
-    }
-    return filled;
+  // Reads up to `size` bytes into the session. Their first copy is freed before the tree is built,
+  // which can then use its memory.
+  static std::size_t Feed(ExpatSession& session, std::size_t size, Reader& reader) {
+    Piece piece;
+    piece.Fill(reader, size);
+    const std::string_view text = piece.Text();
+    char* buffer = session.Buffer(std::max(text.size(), std::size_t{1}));
+    text.copy(buffer, text.size());
+    return text.size();
   }
 
   Ref<Reader> reader_;

@@ -51,6 +51,14 @@ TEST(CertificateCacheTest, KeepsOneOfEqualCertificates) {
   EXPECT_EQ(cache.Size(), 1U);
 }
 
+TEST(CertificateCacheTest, KeepsNoCertificateThatIsUnusuallyLarge) {
+  CertificateCache cache(2);
+  cache.Add(MakeCertificate({.comment = std::string(14'000, 'c')}));
+  EXPECT_EQ(cache.Size(), 1U);
+  cache.Add(MakeCertificate({.comment = std::string(17'000, 'c')}));
+  EXPECT_EQ(cache.Size(), 1U);
+}
+
 TEST(CertificateCacheTest, ProcessCacheIsBounded) {
   for (int i = 0; i < 300; ++i) {
     Make(std::to_string(i).c_str());

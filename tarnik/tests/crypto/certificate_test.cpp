@@ -13,9 +13,10 @@
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/crypto_exception.h>
 
+#include "crypto/certificate_impl.h"
 #include "support/openssl.h"
+#include "support/temporary_file.h"
 #include "support/test_certificates.h"
-#include "support/test_pki.h"
 #include "support/thrown_message.h"
 
 namespace Tarnik::Testing {
@@ -55,6 +56,18 @@ TEST(CertificateTest, ReturnsItsFields) {
   EXPECT_EQ(certificate->ToString(), "Certificate of CN=J\xC3\xBCrgen,O=Test\\, Inc.");
 }
 
+// 2^511 and 2^512: without the limit, a number of a megabyte would take a minute.
+TEST(CertificateTest, HasASerialNumberOfLimitedLength) {
+  const OpenSsl::OwnedBigNumber number(BN_new());
+  ASSERT_EQ(BN_set_bit(number.get(), 511), 1);
+  const OpenSsl::OwnedMemory<char> longest(BN_bn2dec(number.get()));
+  EXPECT_EQ(MakeCertificate({.serial = longest.get()})->SerialNumber(), longest.get());
+  ASSERT_EQ(BN_set_bit(number.get(), 512), 1);
+  const OpenSsl::OwnedMemory<char> longer(BN_bn2dec(number.get()));
+  EXPECT_EQ(DecodeError(MakeCertificateDer({.serial = longer.get()})),
+            "The certificate's serial number has more than 64 bytes.");
+}
+
 TEST(CertificateTest, EscapesControlCharactersInNames) {
   const auto certificate = MakeCertificate({.commonName = std::string("a\0b", 3)});
   EXPECT_EQ(certificate->SubjectName(), "CN=a\\00b,O=Test\\, Inc.");
@@ -78,6 +91,29 @@ TEST(CertificateTest, ReturnsItsBytesUnchanged) {
 TEST(CertificateTest, ReturnsTheSubjectKeyIdentifier) {
   EXPECT_EQ(MakeCertificate({.withKeyIdentifier = true})->SubjectKeyIdentifier().size(), 20U);
   EXPECT_THAT(MakeCertificate()->SubjectKeyIdentifier(), IsEmpty());
+}
+
+TEST(CertificateTest, ReturnsItsPublicKeyAsItIsEncoded) {
+  const auto key = MakeEcKey("P-256");
+  unsigned char* bytes = nullptr;
+  const int length = i2d_PUBKEY(key.get(), &bytes);
+  const OpenSsl::OwnedMemory<unsigned char> owner(bytes);
+  const auto certificate = MakeCertificate({.key = key.get()});
+  EXPECT_EQ(dynamic_cast<const CertificateImpl&>(*certificate).SubjectPublicKeyInfo(),
+            std::vector<unsigned char>(bytes, bytes + length));
+}
+
+// RFC 5280, section 4.2.1.2, method 1, which OpenSSL uses for the extension too.
+TEST(CertificateTest, HasTheUsualKeyIdentifierWithoutTheExtension) {
+  const auto with = MakeCertificate({.withKeyIdentifier = true});
+  const auto without = MakeCertificate();
+  const auto identifierOf = [](const Certificate& certificate) {
+    return dynamic_cast<const CertificateImpl&>(certificate).KeyIdentifier();
+  };
+  EXPECT_EQ(identifierOf(*with), with->SubjectKeyIdentifier());
+  EXPECT_EQ(identifierOf(*without), with->SubjectKeyIdentifier());
+  EXPECT_NE(identifierOf(*MakeCertificate({.key = MakeEcKey("P-256").get()})),
+            with->SubjectKeyIdentifier());
 }
 
 TEST(CertificateTest, IsNotDecodedAgainWhenItsBytesAreKnown) {

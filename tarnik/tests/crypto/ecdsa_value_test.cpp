@@ -17,16 +17,27 @@ TEST(EcdsaValueTest, IsWrittenAsTwoIntegersOfMinimalLength) {
               ElementsAre(0x30, 8, 0x02, 1, 1, 0x02, 3, 0, 0x80, 0));
 }
 
-TEST(EcdsaValueTest, MustBeExactlyTwiceAsLongAsTheOrder) {
+TEST(EcdsaValueTest, HasTwoEqualHalvesThatAreNotLongerThanTheOrder) {
   EXPECT_THAT(DerFromRawEcdsa({1, 1, 1, 1}, 2), testing::SizeIs(10));
   EXPECT_THAT(DerFromRawEcdsa({1, 1, 1}, 2), IsEmpty());
   EXPECT_THAT(DerFromRawEcdsa({1, 1, 1, 1, 1}, 2), IsEmpty());
+  EXPECT_THAT(DerFromRawEcdsa({0, 0, 1, 0, 0, 1}, 2), IsEmpty());
+  EXPECT_THAT(DerFromRawEcdsa({1}, 2), IsEmpty());
   EXPECT_THAT(DerFromRawEcdsa({}, 2), IsEmpty());
+}
+
+TEST(EcdsaValueTest, MayOmitLeadingZerosOfBothHalves) {
+  const auto whole = DerFromRawEcdsa({0, 0, 1, 2, 0, 0, 0, 3}, 4);
+  EXPECT_THAT(whole, ElementsAre(0x30, 7, 0x02, 2, 1, 2, 0x02, 1, 3));
+  EXPECT_EQ(DerFromRawEcdsa({0, 1, 2, 0, 0, 3}, 4), whole);
+  EXPECT_EQ(DerFromRawEcdsa({1, 2, 0, 3}, 4), whole);
 }
 
 TEST(EcdsaValueTest, MustNotContainZero) {
   EXPECT_THAT(DerFromRawEcdsa({0, 0, 0, 1}, 2), IsEmpty());
   EXPECT_THAT(DerFromRawEcdsa({0, 1, 0, 0}, 2), IsEmpty());
+  EXPECT_THAT(DerFromRawEcdsa({0, 1}, 2), IsEmpty());
+  EXPECT_THAT(DerFromRawEcdsa({1, 0}, 2), IsEmpty());
 }
 
 TEST(EcdsaValueTest, IsReadAsTwoNumbersOfTheLengthOfTheOrder) {

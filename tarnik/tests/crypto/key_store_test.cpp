@@ -1,3 +1,4 @@
+#include <filesystem>
 #include <stdexcept>
 #include <string>
 
@@ -9,6 +10,7 @@
 
 #include "support/key_texts.h"
 #include "support/openssl.h"
+#include "support/temporary_file.h"
 #include "support/test_certificates.h"
 #include "support/test_pki.h"
 #include "support/thrown_message.h"
@@ -31,6 +33,20 @@ std::string LoadError(const std::string& uri, const PassphraseCallback& passphra
 bool IsShared(const Ref<const PrivateKey>& key) {
   return key->Matches(*MakeCertificate());
 }
+
+/// The working folder of this process as long as this object exists.
+class WorkingFolder {
+ public:
+  explicit WorkingFolder(const std::string& path) : before_(std::filesystem::current_path()) {
+    std::filesystem::current_path(path);
+  }
+  ~WorkingFolder() { std::filesystem::current_path(before_); }
+  WorkingFolder(const WorkingFolder&) = delete;
+  WorkingFolder& operator=(const WorkingFolder&) = delete;
+
+ private:
+  std::filesystem::path before_;
+};
 
 TEST(KeyStoreTest, LoadsAKeyFromAFileUri) {
   const TemporaryFile file(ToPkcs8Pem(SharedRsaKey()));
@@ -76,8 +92,43 @@ TEST(KeyStoreTest, RefusesAFileWithoutAKeyOrWithTwo) {
 }
 
 TEST(KeyStoreTest, RefusesAMissingFile) {
-  EXPECT_EQ(LoadError("file:/nonexistent/key.pem").find("The URI 'file:' gives no private key"),
-            0U);
+  EXPECT_EQ(LoadError("file:/nonexistent/key.pem"),
+            "The URI 'file:' gives no private key: No such file or directory.");
+}
+
+TEST(KeyStoreTest, RefusesAFolder) {
+  const TemporaryFolder folder;
+  const std::string file = folder.Write("key.pem", ToPkcs8Pem(SharedRsaKey()));
+  EXPECT_TRUE(IsShared(LoadPrivateKeyFromUri("file:" + file)));
+  for (const std::string scheme : {"file:", "file://", "FILE://LocalHost"}) {
+    const std::string name = scheme.substr(0, scheme.find(':') + 1);
+    EXPECT_EQ(LoadError(scheme + folder.Path()),
+              "The URI '" + name + "' gives no private key: it names a folder.");
+  }
+}
+
+TEST(KeyStoreTest, RefusesAFileOfAnotherHost) {
+  const TemporaryFile file(ToPkcs8Pem(SharedRsaKey()));
+  EXPECT_TRUE(IsShared(LoadPrivateKeyFromUri("file://localhost" + file.Path())));
+  for (const std::string& uri : {"file://sts.example" + file.Path(), std::string("file:")}) {
+    EXPECT_EQ(LoadError(uri),
+              "The URI 'file:' gives no private key: it names no file of this machine.");
+  }
+}
+
+// OpenSSL would read it, in a descriptor that child processes inherit.
+TEST(KeyStoreTest, ReadsNoFileWhoseNameIsTheUri) {
+  const TemporaryFolder folder;
+  const WorkingFolder working(folder.Path());
+  for (const char* const name : {"file:key.pem", "vault:key.pem"}) {
+    folder.Write(name, ToPkcs8Pem(SharedRsaKey()));
+  }
+  EXPECT_EQ(LoadError("file:key.pem"),
+            "The URI 'file:' gives no private key: No such file or directory.");
+  EXPECT_EQ(LoadError("vault:key.pem"),
+            "The URI 'vault:' gives no private key: a file has the URI as its name.");
+  folder.Write("key.pem", ToPkcs8Pem(SharedRsaKey()));
+  EXPECT_TRUE(IsShared(LoadPrivateKeyFromUri("file:key.pem")));
 }
 
 TEST(KeyStoreTest, RefusesAnUnknownSchemeWithoutRevealingSecrets) {

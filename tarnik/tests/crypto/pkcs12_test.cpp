@@ -10,6 +10,7 @@
 #include <tarnik/crypto/private_key.h>
 
 #include "support/openssl.h"
+#include "support/temporary_file.h"
 #include "support/test_pki.h"
 #include "support/thrown_message.h"
 

@@ -14,8 +14,8 @@
 
 #include "support/key_texts.h"
 #include "support/openssl.h"
+#include "support/temporary_file.h"
 #include "support/test_certificates.h"
-#include "support/test_pki.h"
 #include "support/thrown_message.h"
 
 namespace Tarnik::Testing {

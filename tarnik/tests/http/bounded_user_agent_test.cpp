@@ -114,7 +114,8 @@ TEST_F(BoundedUserAgentAsyncTest, CancelEndsTheExchangesUnderWayAndRefusesLaterO
   EXPECT_TRUE(limit_->IsCancelled());
   EXPECT_THROW(agent_->Wait(first.get(), 0), CancelledException);
   EXPECT_EQ(record->count, 1) << "an exchange that is not under the limit goes on";
-  EXPECT_EQ(record->message, "The request to sts.example:443 was cancelled.");
+  EXPECT_EQ(record->message,
+            "The call was cancelled by its caller. The request to sts.example:443 was cancelled.");
   EXPECT_EQ(record->item, first.get());
   second->Cancel();
 

@@ -10,6 +10,7 @@
 #include <tarnik/ssl/ssl_context.h>
 
 #include "ssl/tls_fixture.h"
+#include "support/temporary_file.h"
 #include "support/test_pki.h"
 #include "support/tls_peer.h"
 

@@ -1,6 +1,3 @@
-#include <cstdio>
-#include <memory>
-#include <stdexcept>
 #include <string>
 
 #include <gmock/gmock.h>
@@ -9,7 +6,9 @@
 #include <tarnik/ssl/ssl_context.h>
 
 #include "ssl/tls_fixture.h"
+#include "support/child_process.h"
 #include "support/client_hello.h"
+#include "support/temporary_file.h"
 #include "support/test_pki.h"
 #include "support/tls_peer.h"
 
@@ -24,18 +23,9 @@ using testing::Not;
 /// The output of the probe in a process whose OpenSSL is configured by `configuration`.
 std::string OfferWith(const std::string& configuration, const std::string& argument = "") {
   const TemporaryFile file(configuration);
-  const std::string command =
-      "OPENSSL_CONF='" + file.Path() + "' " + TARNIK_TLS_POLICY_PROBE + " " + argument;
-  const std::unique_ptr<std::FILE, int (*)(std::FILE*)> output(popen(command.c_str(), "r"), pclose);
-  if (output == nullptr) {
-    throw std::runtime_error("cannot run the probe");
-  }
-  std::string text;
-  char buffer[512];
-  while (std::fgets(buffer, sizeof(buffer), output.get()) != nullptr) {
-    text += buffer;
-  }
-  return text;
+  return RunInShell("OPENSSL_CONF='" + file.Path() + "' " + TARNIK_TLS_POLICY_PROBE + " " +
+                    argument)
+      .output;
 }
 
 std::string SectionForAllContexts(const std::string& settings) {

@@ -11,6 +11,7 @@
 
 #include "ssl/tls_fixture.h"
 #include "support/ca_folder.h"
+#include "support/temporary_file.h"
 #include "support/test_pki.h"
 #include "support/thrown_message.h"
 #include "support/tls_peer.h"

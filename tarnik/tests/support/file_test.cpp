@@ -8,7 +8,7 @@
 #include <tarnik/core/exception.h>
 
 #include "support/sensitive_text.h"
-#include "support/test_pki.h"
+#include "support/temporary_file.h"
 #include "support/thrown_message.h"
 
 namespace Tarnik::Testing {

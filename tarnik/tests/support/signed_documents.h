@@ -2,9 +2,7 @@
 #define TARNIK_TESTS_SUPPORT_SIGNED_DOCUMENTS_H
 
 #include <cstddef>
-#include <fstream>
 #include <initializer_list>
-#include <iterator>
 #include <stdexcept>
 #include <string>
 #include <string_view>
@@ -27,6 +25,7 @@
 #include "support/algorithm_uris.h"
 #include "support/openssl.h"
 #include "support/test_certificates.h"
+#include "support/test_data.h"
 #include "support/xml_text.h"
 
 namespace Tarnik::Testing {
@@ -134,14 +133,6 @@ inline constexpr std::string_view kUnsigned =
 inline std::string Signed(const DevSts::SignOptions& options = {}, std::string_view xml = kUnsigned,
                           const DevSts::Credential& signer = Signer()) {
   return DevSts::SignXml(xml, signer.privateKeyPem, signer.certificatePem, options);
-}
-
-inline std::string ReadTestData(const std::string& name) {
-  std::ifstream file(std::string(TARNIK_TEST_DATA) + "/" + name, std::ios::binary);
-  if (!file) {
-    throw std::runtime_error("test data is missing: " + name);
-  }
-  return {std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
 }
 
 /// The document with a new signature value by RSA-SHA256 over its SignedInfo, so that only a digest

@@ -1,11 +1,7 @@
 #include "support/software_tpm.h"
 
-#include <array>
 #include <chrono>
-#include <cstdio>
 #include <cstdlib>
-#include <filesystem>
-#include <memory>
 #include <stdexcept>
 #include <string>
 #include <thread>
@@ -13,13 +9,14 @@
 
 #include <arpa/inet.h>
 #include <fcntl.h>
-#include <gtest/gtest.h>
 #include <netinet/in.h>
 #include <signal.h>
 #include <spawn.h>
 #include <sys/socket.h>
 #include <sys/wait.h>
 #include <unistd.h>
+
+#include "support/child_process.h"
 
 extern char** environ;
 
@@ -28,10 +25,6 @@ namespace {
 
 constexpr int kAttempts = 20;
 constexpr std::chrono::seconds kStartLimit{20};
-
-struct ClosePipe {
-  void operator()(std::FILE* pipe) const { pclose(pipe); }
-};
 
 class Socket {
  public:
@@ -79,21 +72,13 @@ int FreePortPair() {
   throw std::runtime_error("test set-up failed: no two free ports");
 }
 
-std::string MakeFolder() {
-  std::string path = testing::TempDir() + "tpm_XXXXXX";
-  if (mkdtemp(path.data()) == nullptr) {
-    throw std::runtime_error("test set-up failed: folder");
-  }
-  return path;
-}
-
 }  // namespace
 
 bool SoftwareTpm::IsInstalled() {
   return std::system("command -v swtpm tpm2_createprimary >/dev/null") == 0;
 }
 
-SoftwareTpm::SoftwareTpm() : folder_(MakeFolder()) {
+SoftwareTpm::SoftwareTpm() {
   // Another process may take the ports in between: then the program ends and other ports are tried.
   for (int i = 0; i < kAttempts; ++i) {
     const int port = FreePortPair();
@@ -104,13 +89,11 @@ SoftwareTpm::SoftwareTpm() : folder_(MakeFolder()) {
     }
     Stop();
   }
-  std::filesystem::remove_all(folder_);
   throw std::runtime_error("test set-up failed: the TPM does not start");
 }
 
 SoftwareTpm::~SoftwareTpm() {
   Stop();
-  std::filesystem::remove_all(folder_);
 }
 
 void SoftwareTpm::StartOn(int port) {
@@ -118,7 +101,7 @@ void SoftwareTpm::StartOn(int port) {
                                     "socket",
                                     "--tpm2",
                                     "--tpmstate",
-                                    "dir=" + folder_,
+                                    "dir=" + folder_.Path(),
                                     "--server",
                                     "type=tcp,bindaddr=127.0.0.1,port=" + std::to_string(port),
                                     "--ctrl",
@@ -167,7 +150,7 @@ void SoftwareTpm::Stop() {
 
 void SoftwareTpm::MakeKey(const std::string& algorithm, const std::string& attributes,
                           const std::string& pin, const std::string& handle) const {
-  const std::string context = folder_ + "/key.ctx";
+  const std::string context = folder_.Path() + "/key.ctx";
   const std::string output =
       Run("tpm2_createprimary -Q -C o -G " + algorithm + " -a '" + attributes + "' -p " + pin +
           " -c " + context + " && tpm2_evictcontrol -Q -C o -c " + context + " " + handle +
@@ -180,16 +163,7 @@ void SoftwareTpm::MakeKey(const std::string& algorithm, const std::string& attri
 std::string SoftwareTpm::Run(const std::string& command) const {
   const std::string located = "export TPM2TOOLS_TCTI=" + location_ +
                               " TPM2OPENSSL_TCTI=" + location_ + " TSS2_LOG=all+none; " + command;
-  const std::unique_ptr<std::FILE, ClosePipe> pipe(popen(located.c_str(), "re"));
-  if (pipe == nullptr) {
-    throw std::runtime_error("test set-up failed: shell");
-  }
-  std::string output;
-  std::array<char, 256> buffer;
-  while (std::fgets(buffer.data(), static_cast<int>(buffer.size()), pipe.get()) != nullptr) {
-    output += buffer.data();
-  }
-  return output;
+  return RunInShell(located).output;
 }
 
 }  // namespace Tarnik::Testing

@@ -5,6 +5,8 @@
 
 #include <sys/types.h>
 
+#include "support/temporary_file.h"
+
 namespace Tarnik::Testing {
 
 /// A TPM in a separate process that listens on the loopback interface: a device whose keys never
@@ -31,7 +33,7 @@ class SoftwareTpm {
   bool AwaitConnections(int port);
   void Stop();
 
-  std::string folder_;
+  TemporaryFolder folder_;
   std::string location_;
   pid_t process_ = -1;
 };

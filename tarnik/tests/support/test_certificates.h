@@ -52,6 +52,7 @@ struct CertificateRecipe {
   const char* notBefore = "20240305070809Z";
   const char* notAfter = "20990305070809Z";
   bool withKeyIdentifier = false;
+  std::string comment{};  // an extension, if it is not empty
 };
 
 inline void AddName(X509_NAME* name, const char* field, const std::string& text) {
@@ -82,6 +83,11 @@ inline std::vector<unsigned char> MakeCertificateDer(const CertificateRecipe& re
     const OpenSsl::Owned<X509_EXTENSION, X509_EXTENSION_free> extension(
         X509V3_EXT_conf_nid(nullptr, &context, NID_subject_key_identifier, "hash"));
     Require(X509_add_ext(raw, extension.get(), -1) == 1, "key identifier");
+  }
+  if (!recipe.comment.empty()) {
+    const OpenSsl::Owned<X509_EXTENSION, X509_EXTENSION_free> extension(
+        X509V3_EXT_conf_nid(nullptr, nullptr, NID_netscape_comment, recipe.comment.c_str()));
+    Require(X509_add_ext(raw, extension.get(), -1) == 1, "comment");
   }
   const bool hashless = EVP_PKEY_get_base_id(recipe.key) == EVP_PKEY_ED25519;
   Require(X509_sign(raw, recipe.key, hashless ? nullptr : EVP_sha256()) > 0, "signature");

@@ -1,15 +1,12 @@
 #include "support/test_pki.h"
 
 #include <cstddef>
-#include <cstdlib>
 #include <ctime>
 #include <stdexcept>
 #include <string>
 
-#include <gtest/gtest.h>
 #include <openssl/pem.h>
 #include <openssl/rand.h>
-#include <unistd.h>
 
 #include <tarnik/crypto/certificate.h>
 
@@ -161,20 +158,6 @@ std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUp
   const OpenSsl::OwnedBio bio(BIO_new(BIO_s_mem()));
   Require(PEM_write_bio_X509_CRL(bio.get(), crl.get()) == 1);
   return TakeText(bio.get());
-}
-
-TemporaryFile::TemporaryFile(const std::string& content)
-    : path_(testing::TempDir() + "tarnik_XXXXXX") {
-  const int descriptor = mkstemp(path_.data());
-  if (descriptor < 0 ||
-      write(descriptor, content.data(), content.size()) != static_cast<ssize_t>(content.size())) {
-    throw std::runtime_error("cannot write a temporary file");
-  }
-  close(descriptor);
-}
-
-TemporaryFile::~TemporaryFile() {
-  unlink(path_.c_str());
 }
 
 }  // namespace Tarnik::Testing

@@ -45,20 +45,6 @@ Identity MakeCa(const std::string& commonName, const Identity* issuer = nullptr)
 std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUpdate = 3600,
                     long thisUpdate = -3600, std::time_t now = std::time(nullptr));
 
-/// A file in the folder for temporary files, removed with its owner.
-class TemporaryFile {
- public:
-  explicit TemporaryFile(const std::string& content);
-  ~TemporaryFile();
-  TemporaryFile(const TemporaryFile&) = delete;
-  TemporaryFile& operator=(const TemporaryFile&) = delete;
-
-  const std::string& Path() const { return path_; }
-
- private:
-  std::string path_;
-};
-
 }  // namespace Tarnik::Testing
 
 #endif

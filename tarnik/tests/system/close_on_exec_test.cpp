@@ -19,6 +19,8 @@
 
 #include "ssl/tls_fixture.h"
 #include "support/ca_folder.h"
+#include "support/key_texts.h"
+#include "support/temporary_file.h"
 #include "support/test_pki.h"
 #include "support/tls_peer.h"
 
@@ -72,7 +74,7 @@ class Fifo {
 
 /// The flags of the descriptor with which `load` reads a FIFO with this content.
 int FlagsWhile(const std::string& content, const std::function<void(const std::string&)>& load) {
-  const CaFolder folder;
+  const TemporaryFolder folder;
   const Fifo fifo(folder.Path() + "/file");
   int flags = -1;
   std::thread writer([&] { flags = fifo.Serve(content); });
@@ -81,28 +83,18 @@ int FlagsWhile(const std::string& content, const std::function<void(const std::s
   return flags;
 }
 
-std::string KeyPem(const Identity& identity) {
-  const OpenSsl::OwnedBio bio(BIO_new(BIO_s_mem()));
-  EXPECT_EQ(PEM_write_bio_PKCS8PrivateKey(bio.get(), identity.key.get(), nullptr, nullptr, 0,
-                                          nullptr, nullptr),
-            1);
-  char* text = nullptr;
-  const long length = BIO_get_mem_data(bio.get(), &text);
-  return std::string(text, static_cast<std::size_t>(length));
-}
-
 TEST(CloseOnExecTest, HoldsForCertificatesAndKeys) {
   const Identity& leaf = TestPki::Get().leaf;
+  const std::string key = ToPkcs8Pem(leaf.key.get());
   EXPECT_EQ(FlagsWhile(leaf.Pem(), [](const auto& path) { Crypto::LoadCertificates(path); }),
             FD_CLOEXEC);
-  EXPECT_EQ(FlagsWhile(KeyPem(leaf), [](const auto& path) { Crypto::LoadPrivateKey(path, {}); }),
+  EXPECT_EQ(FlagsWhile(key, [](const auto& path) { Crypto::LoadPrivateKey(path, {}); }),
             FD_CLOEXEC);
   for (const std::string scheme : {"file:", "file://", "file://localhost"}) {
-    EXPECT_EQ(FlagsWhile(KeyPem(leaf),
-                         [&scheme](const auto& path) {
-                           Crypto::LoadPrivateKeyFromUri(scheme + path, {});
-                         }),
-              FD_CLOEXEC)
+    EXPECT_EQ(
+        FlagsWhile(
+            key, [&scheme](const auto& path) { Crypto::LoadPrivateKeyFromUri(scheme + path, {}); }),
+        FD_CLOEXEC)
         << scheme;
   }
 }

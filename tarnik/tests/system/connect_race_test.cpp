@@ -1,7 +1,6 @@
 #include "system/connect_race.h"
 
 #include <chrono>
-#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <functional>
@@ -27,6 +26,7 @@
 #include <tarnik/system/tcp_client_socket.h>
 #include <tarnik/system/thread_pool.h>
 
+#include "support/child_process.h"
 #include "support/dead_listener.h"
 #include "support/loopback.h"
 #include "support/outcome.h"
@@ -97,14 +97,6 @@ std::vector<int> TcpSockets() {
 /// "socket:[12345]", for example.
 std::string NameOf(int descriptor) {
   return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(descriptor)).string();
-}
-
-/// The descriptors of a program that this process starts, with what they are.
-std::string DescriptorsOfAChild() {
-  const std::unique_ptr<FILE, int (*)(FILE*)> output(popen("ls -l /proc/self/fd", "r"), pclose);
-  std::string text(1 << 16, '\0');
-  text.resize(std::fread(text.data(), 1, text.size(), output.get()));
-  return text;
 }
 
 bool HasConnection(const LoopbackListener& listener) {
@@ -278,7 +270,7 @@ TEST(ConnectRaceAsyncTest, ItsSocketsAreNotInherited) {
   while (TcpSockets().size() < before + 3) {
     std::this_thread::yield();
   }
-  const std::string inherited = DescriptorsOfAChild();
+  const std::string inherited = RunInShell("ls -l /proc/self/fd").output;
   EXPECT_THAT(inherited, testing::HasSubstr("/proc/"));
   for (const int descriptor : TcpSockets()) {
     EXPECT_EQ(fcntl(descriptor, F_GETFD) & FD_CLOEXEC, FD_CLOEXEC);

@@ -1,3 +1,4 @@
+#include <array>
 #include <atomic>
 #include <chrono>
 #include <filesystem>
@@ -79,6 +80,57 @@ TEST(ThreadPoolTest, RunsCompletionsOnFewThreads) {
   }
   ASSERT_TRUE(IsReadyInTime(done.get_future()));
   EXPECT_LE(threads.size(), 2U);
+}
+
+TEST(ThreadPoolTest, RunsWhatCompletionsStartOnTheSameThread) {
+  struct Chain {
+    std::set<std::thread::id> threads;
+    std::promise<void> done;
+    int left = 400;
+
+    void Continue() {
+      threads.insert(std::this_thread::get_id());
+      if (left-- == 0) {
+        done.set_value();
+      } else if (left % 2 == 0) {
+        GetThreadPool()->RunAfter(1, [this] { Continue(); });
+      } else {
+        GetThreadPool()->Post([this] { Continue(); });
+      }
+    }
+  };
+  // Several at a time, so that all I/O threads have something to do.
+  std::array<Chain, 4> chains;
+  for (Chain& chain : chains) {
+    GetThreadPool()->Post([&chain] { chain.Continue(); });
+  }
+  for (Chain& chain : chains) {
+    ASSERT_TRUE(IsReadyInTime(chain.done.get_future()));
+    EXPECT_EQ(chain.threads.size(), 1U);
+  }
+}
+
+TEST(ThreadPoolTest, SpreadsTheCompletionsOfSeveralThreads) {
+  std::mutex mutex;
+  std::set<std::thread::id> threads;
+  const auto postFromAThread = [&] {
+    std::promise<void> ran;
+    std::thread([&] {
+      GetThreadPool()->Post([&] {
+        {
+          const std::lock_guard lock(mutex);
+          threads.insert(std::this_thread::get_id());
+        }
+        ran.set_value();
+      });
+      EXPECT_TRUE(IsReadyInTime(ran.get_future()));
+    }).join();
+  };
+  // Usually two; a thread of another test may have taken a turn meanwhile.
+  for (int i = 0; i < 20 && threads.size() < 2; ++i) {
+    postFromAThread();
+  }
+  EXPECT_EQ(threads.size(), 2U);
 }
 
 TEST(ThreadPoolTest, RunsCompletionsWhileEveryWorkerIsBlocked) {

@@ -104,7 +104,7 @@ TEST(XMLParserTest, ReportsEventsInDocumentOrderWithTheirPositions) {
   EXPECT_EQ(handler->characters, "\n  \xC3\xA9x\n");
 }
 
-TEST(XMLParserTest, ReportsPositionsBeyondTheFirstChunk) {
+TEST(XMLParserTest, ReportsPositionsBeyondTheFirstPiece) {
   std::string text = "<r>\n";
   for (int line = 0; line < 9000; ++line) {
     text += "<l a='\n'>some text</l>\n";
@@ -113,10 +113,22 @@ TEST(XMLParserTest, ReportsPositionsBeyondTheFirstChunk) {
   EXPECT_EQ(Fault(text), "mismatched tag at line 18002, column 12");
 }
 
-TEST(XMLParserTest, ReportsPositionsAfterTokensLongerThanAChunk) {
-  const std::string filler(70000, '\n');
+TEST(XMLParserTest, ReportsPositionsAfterTokensLongerThanAPiece) {
+  const std::string filler(300000, '\n');
   EXPECT_EQ(Fault("<r><!--" + filler + "--> <wrong></r>"),
-            "mismatched tag at line 70001, column 14");
+            "mismatched tag at line 300001, column 14");
+}
+
+TEST(XMLParserTest, ReadsDocumentsThatEndAroundTheEndOfAPiece) {
+  for (const std::size_t pieces : {std::size_t{8192}, std::size_t{131072}, std::size_t{262144}}) {
+    for (std::size_t size = pieces - 5; size <= pieces + 5; ++size) {
+      const std::string text = "<a>" + std::string(size - 7, 'x');
+      EXPECT_EQ(XmlText(ParseXml(text + "</a>").get()), text + "</a>") << size;
+      EXPECT_EQ(Fault(text + "</b>"),
+                "mismatched tag at line 1, column " + std::to_string(text.size() + 3))
+          << size;
+    }
+  }
 }
 
 TEST(XMLParserTest, CanBeUsedOnlyOnce) {
@@ -135,7 +147,7 @@ TEST(XMLParserTest, RefusesNullArguments) {
 }
 
 TEST(XMLParserTest, PropagatesTheFailureOfTheReader) {
-  for (const std::size_t length : {0, 3, 70000}) {
+  for (const std::size_t length : {0, 3, 300000}) {
     const auto reader = MakeRef<FailingReader>("<a>" + std::string(length, 'x'));
     const Ref<XMLHandler> handler = CreateXMLDocumentHandler();
     EXPECT_THROW(CreateXMLParser(reader.get(), handler.get())->Parse(), ReadFailure);
@@ -210,12 +222,12 @@ TEST(XMLParserTest, RefusesADocumentTruncatedAtAnyByte) {
 
 TEST(XMLParserTest, BuildsTheSameTreeFromPiecesOfAnySize) {
   std::string text = "<a:r xmlns:a='urn:a'>";
-  for (int index = 0; index < 3000; ++index) {
+  for (int index = 0; index < 4000; ++index) {
     text += "<a:e n='" + std::to_string(index) + "'>t\xE2\x82\xAC&lt;\r\n<![CDATA[c]]></a:e>";
   }
   text += "</a:r>";
   const std::string whole = XmlText(ParseXml(text).get());
-  for (const std::size_t piece : {1, 2, 7, 4096, 16383, 16384, 16385}) {
+  for (const std::size_t piece : {1, 2, 7, 4096, 131071, 131072, 131073}) {
     EXPECT_EQ(XmlText(ParseXml(MakeRef<PieceReader>(text, piece).get()).get()), whole) << piece;
   }
 }

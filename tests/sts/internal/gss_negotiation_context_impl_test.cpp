@@ -108,6 +108,15 @@ TEST_F(GssNegotiationContextImplTest, ARefusedTokenStillSetsTheContext) {
   EXPECT_THAT(transport_->bodies[1], HasSubstr("Context=\"c\""));
 }
 
+TEST_F(GssNegotiationContextImplTest, EachLegHasTheContextOfTheAnswerBeforeIt) {
+  Answer({LegAnswer("c1"), LegAnswer("c2"), LegAnswer("c3")});
+  context_->Negotiate({7});
+  context_->Negotiate({8});
+  context_->Negotiate({9});
+  EXPECT_THAT(transport_->bodies[1], HasSubstr("Context=\"c1\""));
+  EXPECT_THAT(transport_->bodies[2], HasSubstr("Context=\"c2\""));
+}
+
 TEST_F(GssNegotiationContextImplTest, AnEmptyContextStartsANewNegotiation) {
   Answer({LegAnswer("")});
   context_->Negotiate({7});

@@ -49,10 +49,12 @@ TARNIK_EXPORT Ref<const PrivateKey> CreatePrivateKeyFromPem(
 /// Reads a PEM file. Throws `IOException` when it cannot be read, and otherwise as above.
 TARNIK_EXPORT Ref<const PrivateKey> LoadPrivateKey(const std::string& path,
                                                    const PassphraseCallback& passphrase = {});
-/// Loads the only private key that `uri` names, through OpenSSL's store: "file:" (RFC 8089), or
-/// another scheme that a provider loaded into this process supports, such as "pkcs11:" (RFC 7512).
-/// A key in a device stays there. Throws `CryptoException` when the URI has no scheme or an
-/// unsupported one, and as above.
+/// Loads the only private key that `uri` names, through OpenSSL's store: "file:" (RFC 8089) with
+/// the path of a file of this machine, or another scheme that a provider loaded into this process
+/// supports, such as "pkcs11:" (RFC 7512). A key in a device stays there. Throws `CryptoException`
+/// when the URI has no scheme or an unsupported one, when the file cannot be read or is a folder,
+/// and as above; also when another scheme's URI is at the same time the path of a file, which
+/// OpenSSL would prefer.
 TARNIK_EXPORT Ref<const PrivateKey> LoadPrivateKeyFromUri(
     const std::string& uri, const PassphraseCallback& passphrase = {});
 

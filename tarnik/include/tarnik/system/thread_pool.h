@@ -39,8 +39,9 @@ class TARNIK_EXPORT ThreadPool : public virtual Object {
   /// `InvalidStateException` when it was not started before the process began to end, and
   /// `std::bad_alloc`. What they were given then never runs.
   virtual void Run(std::function<void()> item) = 0;
-  /// Runs `completion` on an I/O thread, never inside this call; it must not block. Throws as `Run`
-  /// does for an empty function and for the pool.
+  /// Runs `completion` on an I/O thread, never inside this call. It must not block: what it starts
+  /// runs on the same thread, as do half of all connections. Throws as `Run` does for an empty
+  /// function and for the pool.
   virtual void Post(std::function<void()> completion) = 0;
   /// Runs `completion` on an I/O thread after `microseconds`, unless the returned item is cancelled
   /// first; a cancelled completion never runs. Throws as `Post` does.

@@ -79,9 +79,9 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
                                                 std::string_view localName) const noexcept;
 
   /// Sets an attribute by its qualified name: a new one is added last, an existing one keeps its
-  /// position. Throws `InvalidArgumentException` when the name is not a qualified name or the value
-  /// contains what XML 1.0 does not allow (section 2.2: control characters, invalid UTF-8, U+FFFE,
-  /// U+FFFF).
+  /// position. Throws `InvalidArgumentException` when the name is not a qualified name, as
+  /// `CreateElementNode` defines it, or the value contains what XML 1.0 does not allow
+  /// (section 2.2: control characters, invalid UTF-8, U+FFFE, U+FFFF).
   void SetAttribute(std::string_view qualifiedName, std::string_view value);
   /// Removes the attribute; false if the element does not have it.
   bool RemoveAttribute(std::string_view qualifiedName) noexcept;
@@ -107,7 +107,9 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
 
 /// Creates an element without attributes or children. An empty prefix gives an unprefixed name.
 /// Throws `InvalidArgumentException` unless prefix and local name are NCNames (Namespaces in
-/// XML 1.0, section 3).
+/// XML 1.0, section 3) with the letters, digits and other characters of XML 1.0, fourth edition,
+/// appendix B. The parser reads the same names; the further characters of the fifth edition are
+/// refused.
 TARNIK_EXPORT void CreateElementNode(std::string_view prefix, std::string_view localName,
                                      Ref<ElementNode>& element);
 

@@ -54,14 +54,16 @@ inline constexpr std::size_t kMaxOpenAttributes = 1024;
 inline constexpr std::size_t kMaxElementDepth = 256;
 inline constexpr std::size_t kMaxDocumentBytes = std::size_t{16} * 1024 * 1024;
 
-/// Reads one XML 1.0 document from a reader.
+/// Reads one XML 1.0 document from a reader. Names consist of the characters of XML 1.0, fourth
+/// edition (appendix B); `CreateElementNode` and `ElementNode::SetAttribute` accept the same names.
 class TARNIK_EXPORT XMLParser : public virtual Object {
  public:
   /// Parses the document to its end and returns the handler's result. Called once.
   ///
   /// Throws `XMLParseException` with the position of the fault when the document is not
-  /// well-formed, is not UTF-8 (with or without a byte order mark), has a DOCTYPE, nests deeper
-  /// than `kMaxElementDepth`, or is longer than `kMaxDocumentBytes`.
+  /// well-formed, declares another version than 1.0, is not UTF-8 (with or without a byte order
+  /// mark), has a DOCTYPE, nests deeper than `kMaxElementDepth`, or is longer than
+  /// `kMaxDocumentBytes`.
   virtual Ref<Object> Parse() = 0;
 };
 

@@ -87,6 +87,20 @@ std::vector<std::string> SplitPrefixes(std::string_view list) {
   return prefixes;
 }
 
+bool IsPrefixList(const ElementNode* parameter, std::string_view namespaceUri) {
+  return parameter->LocalName() == "InclusiveNamespaces" &&
+         parameter->NamespaceUri() == namespaceUri;
+}
+
+// Takes the only parameter of an algorithm, which is an InclusiveNamespaces element.
+std::string_view TakePrefixList(ContentReader& content) {
+  const ElementNode* parameter = content.TakeAny();
+  content.ExpectEnd();
+  ExpectAttributes(parameter, {"PrefixList"});
+  ContentReader(parameter).ExpectEnd();
+  return parameter->FindAttribute("PrefixList").value_or("");
+}
+
 // Exclusive XML Canonicalization 1.0, section 4.
 std::vector<std::string> InclusivePrefixesOf(std::string_view algorithm,
                                              const ElementNode* element) {
@@ -94,17 +108,24 @@ std::vector<std::string> InclusivePrefixesOf(std::string_view algorithm,
   if (content.Peek() == nullptr) {
     return {};
   }
-  const ElementNode* parameter = content.TakeAny();
-  if (parameter->LocalName() != "InclusiveNamespaces" ||
-      parameter->NamespaceUri() != kExclusiveNamespace) {
+  if (!IsPrefixList(content.Peek(), kExclusiveNamespace)) {
     throw XmlSecurityException("The algorithm " + Quote(algorithm) + " does not take " +
-                               Quote(parameter->QualifiedNameText()) + " as a parameter.");
+                               Quote(content.Peek()->QualifiedNameText()) + " as a parameter.");
   }
-  content.ExpectEnd();
-  ExpectAttributes(parameter, {"PrefixList"});
-  ContentReader(parameter).ExpectEnd();
-  const auto prefixes = parameter->FindAttribute("PrefixList");
-  return prefixes ? SplitPrefixes(*prefixes) : std::vector<std::string>();
+  return SplitPrefixes(TakePrefixList(content));
+}
+
+// Some signers give every transform of a reference the prefix list of its canonicalisation, in the
+// namespace of that transform. Removing the signature does not depend on prefixes.
+void SkipPrefixListOfEnveloped(const ElementNode* element) {
+  ContentReader content(element);
+  const ElementNode* parameter = content.Peek();
+  if (parameter != nullptr &&
+      (IsPrefixList(parameter, kExclusiveNamespace) || IsPrefixList(parameter, kEnveloped))) {
+    TakePrefixList(content);
+    return;
+  }
+  ExpectNoParameters(kEnveloped, element);
 }
 
 C14nOptions LookUpC14n(std::string_view algorithm, const ElementNode* element, const char* kind) {
@@ -134,6 +155,15 @@ Hash LookUpDigestMethod(std::string_view algorithm, const ElementNode* element) 
   return hash;
 }
 
+std::optional<Hash> FindDigestMethod(std::string_view algorithm) noexcept {
+  for (const SupportedDigestMethod& supported : kDigestMethods) {
+    if (supported.algorithm == algorithm) {
+      return supported.hash;
+    }
+  }
+  return std::nullopt;
+}
+
 C14nOptions LookUpCanonicalizationMethod(std::string_view algorithm, const ElementNode* element) {
   return LookUpC14n(algorithm, element, "canonicalisation");
 }
@@ -143,7 +173,7 @@ TransformPlan PlanTransforms(const std::vector<std::string>& algorithms,
   TransformPlan plan;
   std::size_t next = 0;
   if (next < algorithms.size() && algorithms[next] == kEnveloped) {
-    ExpectNoParameters(kEnveloped, elements[next]);
+    SkipPrefixListOfEnveloped(elements[next]);
     plan.enveloped = true;
     ++next;
   }

@@ -1,6 +1,7 @@
 #ifndef TARNIK_XML_SECURITY_ALGORITHMS_H
 #define TARNIK_XML_SECURITY_ALGORITHMS_H
 
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -28,6 +29,9 @@ SignatureMethod LookUpSignatureMethod(std::string_view algorithm, const ElementN
 /// SHA-256, SHA-384 and SHA-512 (XML Encryption, section 5.7; RFC 6931, section 2.1.3).
 Crypto::Hash LookUpDigestMethod(std::string_view algorithm, const ElementNode* element);
 
+/// The same, but nothing for an algorithm that is not on the list.
+std::optional<Crypto::Hash> FindDigestMethod(std::string_view algorithm) noexcept;
+
 /// Canonical XML 1.0 and Exclusive XML Canonicalization 1.0, with and without comments.
 C14nOptions LookUpCanonicalizationMethod(std::string_view algorithm, const ElementNode* element);
 
@@ -39,6 +43,7 @@ struct TransformPlan {
 
 /// Accepts enveloped-signature and then one canonicalisation, both optional. Without a
 /// canonicalisation the reference uses Canonical XML 1.0 (XML Signature 1.1, section 4.4.3.2).
+/// enveloped-signature may have one InclusiveNamespaces element, which has no effect there.
 TransformPlan PlanTransforms(const std::vector<std::string>& algorithms,
                              const std::vector<const ElementNode*>& elements);
 

@@ -11,6 +11,8 @@
 namespace Tarnik::Xml::Security {
 
 inline constexpr std::string_view kDsNamespace = "http://www.w3.org/2000/09/xmldsig#";
+/// The elements that XML Signature 1.1 added.
+inline constexpr std::string_view kDs11Namespace = "http://www.w3.org/2009/xmldsig11#";
 
 /// True for text that contains only tabs, line feeds, carriage returns and blanks.
 bool IsWhiteSpace(std::string_view text) noexcept;

@@ -17,30 +17,20 @@ using Crypto::SignatureScheme;
 // NIST SP 800-131A: shorter RSA keys are disallowed.
 constexpr int kMinRsaBits = 2048;
 
-bool FitsScheme(const PublicKeyImpl& key, SignatureScheme scheme) noexcept {
-  switch (scheme) {
-    case SignatureScheme::kRsaPkcs1:
-      return key.Algorithm() == KeyAlgorithm::kRsa;
-    case SignatureScheme::kRsaPss:
-      return key.Algorithm() == KeyAlgorithm::kRsa || key.Algorithm() == KeyAlgorithm::kRsaPss;
-    case SignatureScheme::kEcdsa:
-      break;
-  }
-  return key.Algorithm() == KeyAlgorithm::kEc;
+bool IsStrong(const PublicKeyImpl& key, SignatureScheme scheme) noexcept {
+  return scheme == SignatureScheme::kEcdsa ? key.NamedCurve() != Curve::kNone
+                                           : key.Bits() >= kMinRsaBits;
 }
 
 void CheckStrength(const PublicKeyImpl& key, SignatureScheme scheme, const std::string& owner) {
-  if (scheme == SignatureScheme::kEcdsa) {
-    if (key.NamedCurve() == Curve::kNone) {
-      throw XmlSecurityException("The " + owner +
-                                 " key is not on the curve P-256, P-384 or P-521.");
-    }
+  if (IsStrong(key, scheme)) {
     return;
   }
-  if (key.Bits() < kMinRsaBits) {
-    throw XmlSecurityException("The " + owner + " RSA key has " + std::to_string(key.Bits()) +
-                               " bits; at least " + std::to_string(kMinRsaBits) + " are needed.");
+  if (scheme == SignatureScheme::kEcdsa) {
+    throw XmlSecurityException("The " + owner + " key is not on the curve P-256, P-384 or P-521.");
   }
+  throw XmlSecurityException("The " + owner + " RSA key has " + std::to_string(key.Bits()) +
+                             " bits; at least " + std::to_string(kMinRsaBits) + " are needed.");
 }
 
 const char* TypeName(KeyAlgorithm algorithm) noexcept {
@@ -71,15 +61,31 @@ const char* NeededType(SignatureScheme scheme) noexcept {
 
 }  // namespace
 
+bool IsOfType(const PublicKeyImpl& key, SignatureScheme scheme) noexcept {
+  switch (scheme) {
+    case SignatureScheme::kRsaPkcs1:
+      return key.Algorithm() == KeyAlgorithm::kRsa;
+    case SignatureScheme::kRsaPss:
+      return key.Algorithm() == KeyAlgorithm::kRsa || key.Algorithm() == KeyAlgorithm::kRsaPss;
+    case SignatureScheme::kEcdsa:
+      break;
+  }
+  return key.Algorithm() == KeyAlgorithm::kEc;
+}
+
+bool IsUsableKey(const PublicKeyImpl& key, SignatureScheme scheme) noexcept {
+  return IsOfType(key, scheme) && IsStrong(key, scheme);
+}
+
 void CheckTrustedKey(const PublicKeyImpl& key, SignatureScheme scheme) {
-  if (!FitsScheme(key, scheme)) {
+  if (!IsOfType(key, scheme)) {
     throw XmlSecurityException("The trusted key is not of the type of the signature algorithm.");
   }
   CheckStrength(key, scheme, "trusted");
 }
 
 void CheckSigningKey(const PublicKeyImpl& key, SignatureScheme scheme, std::string_view algorithm) {
-  if (!FitsScheme(key, scheme)) {
+  if (!IsOfType(key, scheme)) {
     throw XmlSecurityException(std::string("The private key is ") + TypeName(key.Algorithm()) +
                                "; the signature algorithm " + Quote(algorithm) + " needs " +
                                NeededType(scheme) + ".");

@@ -12,8 +12,6 @@
 namespace Tarnik::Xml::Security {
 namespace {
 
-constexpr std::string_view kDs11Namespace = "http://www.w3.org/2009/xmldsig11#";
-
 [[noreturn]] void Refuse(const ElementNode* parent, const ElementNode* child) {
   throw SignatureSyntaxException("Element " + Quote(parent->QualifiedNameText()) +
                                  " may not hold " + Quote(child->QualifiedNameText()) + ".");

@@ -4,11 +4,12 @@
 #include <string_view>
 
 #include <tarnik/xml/document.h>
+#include <tarnik/xml/security/ids.h>
 #include <tarnik/xml/security/xml_security_exception.h>
 
 #include "support/ascii.h"
 #include "support/quote.h"
-#include "xml/security/content_reader.h"
+#include "xml/tree_builder.h"
 
 namespace Tarnik::Xml::Security {
 namespace {
@@ -33,12 +34,6 @@ bool IsPlainId(std::string_view text) noexcept {
          std::all_of(text.begin(), text.end(), IsIdCharacter);
 }
 
-// True for "id" in any letter case (id, Id, iD, ID), whatever the prefix: other software may treat
-// such an attribute as an id, even where `IsTrueId` does not.
-bool IsIdInAnyCase(std::string_view localName) noexcept {
-  return EqualsIgnoringCase(localName, "id");
-}
-
 bool IsTrueId(const ElementNode* element, const QualifiedName& name) noexcept {
   if (name.Prefix().empty()) {
     return name.Local() == "ID" || name.Local() == "Id" || name.Local() == "id";
@@ -49,13 +44,8 @@ bool IsTrueId(const ElementNode* element, const QualifiedName& name) noexcept {
   return name.Local() == "Id" && element->LookupNamespace(name.Prefix()) == kWsuNamespace;
 }
 
-void CompareId(const ElementNode* element, const Attribute& attribute, IdLookup& lookup) {
-  // An xml:id is compared without surrounding blanks (xml:id 1.0, section 4), and some software
-  // does so for every id. A value that only such software would find counts as a second element
-  // too.
-  if (Trim(attribute.Value()) != lookup.id) {
-    return;
-  }
+// `attribute` may be taken for an id with the value of `lookup`, even where `IsTrueId` says no.
+void Count(const ElementNode* element, const Attribute& attribute, IdLookup& lookup) {
   if (lookup.element != nullptr && lookup.element != element) {
     throw XmlSecurityException("More than one element has the id " + Quote(lookup.id) +
                                " of a reference.");
@@ -67,13 +57,17 @@ void CompareId(const ElementNode* element, const Attribute& attribute, IdLookup&
 }
 
 void CollectIdsOf(const ElementNode* element, std::vector<IdLookup>& lookups) {
-  for (std::size_t i = 0; i < element->AttributeCount(); ++i) {
-    const Attribute& attribute = element->AttributeAt(i);
-    if (!IsIdInAnyCase(attribute.Qualified().Local())) {
+  const Attribute* const attributes = TreeBuilder::AttributesOf(*element);
+  for (std::size_t i = 0; i < TreeBuilder::AttributeCountOf(*element); ++i) {
+    const Attribute& attribute = attributes[i];
+    const auto id = PossibleId(attribute);
+    if (!id) {
       continue;
     }
     for (IdLookup& lookup : lookups) {
-      CompareId(element, attribute, lookup);
+      if (*id == lookup.id) {
+        Count(element, attribute, lookup);
+      }
     }
   }
 }

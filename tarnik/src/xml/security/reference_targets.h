@@ -14,7 +14,7 @@ namespace Tarnik::Xml::Security {
 ///
 /// An id is an attribute "ID", "Id" or "id" without a prefix, xml:id, or wsu:Id. Throws
 /// `XmlSecurityException` when a URI has another form, when no element has the id, and when another
-/// element has the same value in any attribute whose local name is "id" in any letter case.
+/// element has the same `PossibleId`.
 std::vector<const Node*> FindReferenceTargets(const Node* root, const ElementNode* signature,
                                               const std::vector<Reference>& references);
 

@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <exception>
 #include <utility>
 
 #include <tarnik/core/exception.h>
@@ -9,35 +10,17 @@
 #include "crypto/ecdsa_value.h"
 #include "crypto/public_key_impl.h"
 #include "xml/security/digest_writer.h"
-#include "xml/security/key_check.h"
+#include "xml/security/key_selection.h"
 #include "xml/security/new_signature.h"
 #include "xml/security/reference_targets.h"
 #include "xml/security/signature_impl.h"
 #include "xml/security/signature_plan.h"
-#include "xml/security/signer_description.h"
 
 namespace Tarnik::Xml::Security {
 namespace {
 
 using Crypto::PublicKeyImpl;
 using Crypto::SignatureScheme;
-
-Ref<const Crypto::PublicKey> ResolveKey(const KeyInfoResolver& resolver, const KeyInfo& keyInfo) {
-  Ref<const Crypto::PublicKey> key = resolver.Resolve(keyInfo);
-  if (key == nullptr) {
-    throw XmlSecurityException("There is no trusted key for the signature, " +
-                               DescribeSigner(keyInfo) + ".");
-  }
-  return key;
-}
-
-const PublicKeyImpl& ImplementationOf(const Crypto::PublicKey& key) {
-  const auto* implementation = dynamic_cast<const PublicKeyImpl*>(&key);
-  if (implementation == nullptr) {
-    throw XmlSecurityException("The trusted key was not made by this library.");
-  }
-  return *implementation;
-}
 
 bool IsSignatureOf(const Digest& digest, const std::vector<unsigned char>& value,
                    const PublicKeyImpl& key, const SignaturePlan& plan) {
@@ -67,12 +50,38 @@ bool AllDigestsMatch(const SignatureContent& content, const SignaturePlan& plan,
   return true;
 }
 
+// A failure of the library with one key does not keep another from verifying the signature.
+bool IsSignatureOfAny(const Digest& digest, const std::vector<unsigned char>& value,
+                      const KeySelection& selection, const SignaturePlan& plan) {
+  std::exception_ptr failure;
+  for (const Ref<const PublicKeyImpl>& key : selection.keys) {
+    try {
+      if (IsSignatureOf(digest, value, *key, plan)) {
+        return true;
+      }
+    } catch (const Crypto::CryptoException&) {
+      failure = std::current_exception();
+    }
+  }
+  if (failure != nullptr) {
+    std::rethrow_exception(failure);
+  }
+  return false;
+}
+
 // The signature over SignedInfo is verified first, so that the work that the references require is
-// done only for the owner of the key.
-bool IsValid(const SignatureContent& content, const SignaturePlan& plan, const PublicKeyImpl& key) {
+// done only for the owner of a trusted key.
+bool IsValid(const SignatureContent& content, const SignaturePlan& plan,
+             const KeySelection& selection) {
   DigestWriter writer;
-  return IsSignatureOf(ComputeDigest(plan.signedInfo, writer), content.signatureValue, key, plan) &&
-         AllDigestsMatch(content, plan, writer);
+  const Digest digest = ComputeDigest(plan.signedInfo, writer);
+  if (IsSignatureOfAny(digest, content.signatureValue, selection, plan)) {
+    return AllDigestsMatch(content, plan, writer);
+  }
+  if (selection.isChoice) {
+    RefuseAllKeys(selection, content.keyInfo);
+  }
+  return false;
 }
 
 [[noreturn]] void RefuseChange() {
@@ -104,11 +113,9 @@ bool SignatureImpl::Verify(const KeyInfoResolver* resolver) const {
     throw XmlSecurityException("A signature cannot be verified without a key resolver.");
   }
   const SignaturePlan plan = PlanSignature(RootOf(element_.get()), element_.get(), content_);
-  const Ref<const Crypto::PublicKey> key = ResolveKey(*resolver, content_.keyInfo);
-  const PublicKeyImpl& implementation = ImplementationOf(*key);
-  CheckTrustedKey(implementation, plan.scheme);
+  const KeySelection selection = SelectKeys(*resolver, content_.keyInfo, plan.scheme);
   try {
-    return IsValid(content_, plan, implementation);
+    return IsValid(content_, plan, selection);
   } catch (const Crypto::CryptoException& error) {
     throw XmlSecurityException(error.Message());
   }

@@ -7,6 +7,10 @@
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/text/display_text.h>
+#include <tarnik/xml/security/key_hints.h>
+
+#include "crypto/hash.h"
+#include "xml/security/algorithms.h"
 
 namespace Tarnik::Xml::Security {
 namespace {
@@ -30,15 +34,51 @@ std::string DescribeCertificate(const std::vector<unsigned char>& der) {
   }
 }
 
-std::string DescribeIdentifier(const std::vector<unsigned char>& identifier) {
+std::string Hexadecimal(const std::vector<unsigned char>& bytes, std::size_t maxBytes) {
   constexpr char kDigits[] = "0123456789abcdef";
   std::string text;
-  for (std::size_t i = 0; i < std::min(identifier.size(), kMaxIdentifier); ++i) {
-    text.push_back(kDigits[identifier[i] >> 4]);
-    text.push_back(kDigits[identifier[i] & 0xF]);
+  for (std::size_t i = 0; i < std::min(bytes.size(), maxBytes); ++i) {
+    text.push_back(kDigits[bytes[i] >> 4]);
+    text.push_back(kDigits[bytes[i] & 0xF]);
   }
-  return "whose signer has the subject key identifier '" + text +
-         (identifier.size() > kMaxIdentifier ? "...'" : "'");
+  return "'" + text + (bytes.size() > maxBytes ? "...'" : "'");
+}
+
+std::string DescribeDigest(const KeyHints::CertificateDigest& digest) {
+  if (digest.value.empty()) {
+    return "whose certificate has a digest that cannot be read";
+  }
+  return "whose certificate has the digest " + Hexadecimal(digest.value, Crypto::kMaxHashLength) +
+         " by " + Shown(digest.algorithm, kMaxName);
+}
+
+// Operators can compute the same hash of a public key file.
+std::string DescribeKey(const std::vector<unsigned char>& key) {
+  if (key.empty()) {
+    return "whose key cannot be read";
+  }
+  try {
+    const auto hash = Crypto::HashOf(Crypto::Hash::kSha256, key.data(), key.size());
+    return "whose key has the SHA-256 hash " + Hexadecimal(hash, hash.size());
+  } catch (const Crypto::CryptoException&) {
+    return "which contains its key";
+  }
+}
+
+// In the order in which the resolvers prefer them. A digest by another algorithm is no hint.
+std::string DescribeKeyHints(const KeyHints& hints, const KeyInfo& keyInfo) {
+  for (const KeyHints::CertificateDigest& digest : hints.certificateDigests) {
+    if (FindDigestMethod(digest.algorithm)) {
+      return DescribeDigest(digest);
+    }
+  }
+  if (!hints.publicKeys.empty()) {
+    return DescribeKey(hints.publicKeys.front());
+  }
+  if (!keyInfo.keyNames.empty()) {
+    return "whose key is named " + Shown(keyInfo.keyNames.front(), kMaxName);
+  }
+  return "which names no signer";
 }
 
 }  // namespace
@@ -53,15 +93,13 @@ std::string DescribeSigner(const KeyInfo& keyInfo) {
            " with the serial number " + Shown(signer.serialNumber, kMaxNumber);
   }
   if (!keyInfo.subjectKeyIdentifiers.empty()) {
-    return DescribeIdentifier(keyInfo.subjectKeyIdentifiers.front());
+    return "whose signer has the subject key identifier " +
+           Hexadecimal(keyInfo.subjectKeyIdentifiers.front(), kMaxIdentifier);
   }
   if (!keyInfo.subjectNames.empty()) {
     return "whose certificate is of " + Shown(keyInfo.subjectNames.front(), kMaxName);
   }
-  if (!keyInfo.keyNames.empty()) {
-    return "whose key is named " + Shown(keyInfo.keyNames.front(), kMaxName);
-  }
-  return "which names no signer";
+  return DescribeKeyHints(ReadKeyHints(keyInfo), keyInfo);
 }
 
 }  // namespace Tarnik::Xml::Security

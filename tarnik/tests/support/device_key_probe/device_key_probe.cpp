@@ -2,14 +2,14 @@
 // A separate program, since a loaded provider serves the whole process.
 #include <iostream>
 #include <string>
-#include <utility>
 
 #include <openssl/provider.h>
 
 #include <tarnik/core/exception.h>
-#include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/private_key.h>
 #include <tarnik/xml/security/signature.h>
+
+#include "support/one_key_resolver.h"
 
 namespace {
 
@@ -20,17 +20,6 @@ using Tarnik::Xml::ElementNode;
 namespace Security = Tarnik::Xml::Security;
 
 constexpr const char* kExclusive = "http://www.w3.org/2001/10/xml-exc-c14n#";
-
-class KeyResolver final : public Security::KeyInfoResolver, public Tarnik::ObjectImpl {
- public:
-  explicit KeyResolver(Ref<const Tarnik::Crypto::PublicKey> key) : key_(std::move(key)) {}
-  Ref<const Tarnik::Crypto::PublicKey> Resolve(const Security::KeyInfo&) const override {
-    return key_;
-  }
-
- private:
-  const Ref<const Tarnik::Crypto::PublicKey> key_;
-};
 
 bool SignsWhatVerifies(const PrivateKey& key, const std::string& method) {
   Ref<ElementNode> root;
@@ -44,7 +33,8 @@ bool SignsWhatVerifies(const PrivateKey& key, const std::string& method) {
   reference->AddTransform(kExclusive);
   root->AppendChild(signature->Element());
   signature->Sign(&key);
-  return signature->Verify(Tarnik::MakeRef<KeyResolver>(key.GetPublicKey()).get());
+  return signature->Verify(
+      Tarnik::MakeRef<Tarnik::Testing::OneKeyResolver>(key.GetPublicKey()).get());
 }
 
 }  // namespace

@@ -1,5 +1,6 @@
 #include "xml/security/algorithms.h"
 
+#include <optional>
 #include <string>
 
 #include <gmock/gmock.h>
@@ -108,6 +109,16 @@ TEST(TransformListTest, AcceptsOnlyTheSupportedCombinations) {
             "canonicalisation.");
 }
 
+TEST(TransformListTest, ComparesTheEnvelopedMethodWhole) {
+  for (const std::string& uri : {std::string(kEnveloped) + "2", std::string(kEnveloped) + " ",
+                                 std::string(kEnveloped).substr(0, 20)}) {
+    SignatureTemplate signature;
+    signature.transforms = Transforms({uri});
+    EXPECT_EQ(Verdict(AssertionWithValues(signature)),
+              "refused: The transform algorithm '" + uri + "' is not supported.");
+  }
+}
+
 // The oracle accepts the signature, so that only the list of algorithms can be the reason.
 TEST(TransformListTest, RefusesCorrectSignaturesOverXPath) {
   SignatureTemplate signature;
@@ -203,13 +214,99 @@ TEST(AlgorithmParametersTest, OfTheExclusiveMethodAreOnePrefixList) {
             "refused: Element 'c:InclusiveNamespaces' holds the unexpected element 'x'.");
 }
 
+std::string WithParameterOfEnveloped(const std::string& content) {
+  SignatureTemplate signature;
+  signature.transforms = Replaced(signature.transforms, "enveloped-signature\"/>",
+                                  "enveloped-signature\">" + content + "</ds:Transform>");
+  return signature.Text();
+}
+
+// Some signers repeat the prefix list of the canonicalisation in every transform, in the namespace
+// of the canonicalisation or in one that is named after the transform.
+TEST(AlgorithmParametersTest, OfEnvelopedMayBeAPrefixListWithoutEffect) {
+  for (const char* uri : {"http://www.w3.org/2001/10/xml-exc-c14n#",
+                          "http://www.w3.org/2000/09/xmldsig#enveloped-signature"}) {
+    for (const char* list : {"", " PrefixList=\"\"", " PrefixList=\"xs unbound #default\""}) {
+      const std::string parameter =
+          std::string("\n<i:InclusiveNamespaces xmlns:i=\"") + uri + "\"" + list + "/>";
+      const std::string text =
+          Signed({}, AssertionWith(WithParameterOfEnveloped(parameter), "<b/>"));
+      EXPECT_EQ(Verdict(text), "valid") << parameter;
+      EXPECT_EQ(Verdict(Replaced(text, "user@example", "root@example")), "invalid") << parameter;
+    }
+  }
+}
+
+// The oracle accepts these signatures too, so that only the rules for parameters can be the reason.
+TEST(AlgorithmParametersTest, OfEnvelopedMayBeNothingElse) {
+  const std::string list =
+      "<i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>";
+  const auto verdict = [](const std::string& parameter) {
+    return Verdict(Signed({}, AssertionWith(WithParameterOfEnveloped(parameter))));
+  };
+  const auto takesNo = [](const std::string& name) {
+    return "refused: The algorithm 'http://www.w3.org/2000/09/xmldsig#enveloped-signature' takes "
+           "no parameters, but has '" +
+           name + "'.";
+  };
+  EXPECT_EQ(verdict(list), "valid");
+  EXPECT_EQ(verdict(list + list),
+            "refused: Element 'ds:Transform' holds the unexpected element "
+            "'i:InclusiveNamespaces'.");
+  EXPECT_EQ(verdict(list + "<x/>"),
+            "refused: Element 'ds:Transform' holds the unexpected element 'x'.");
+  EXPECT_EQ(verdict(Replaced(list, "/>", " Prefix=\"\"/>")),
+            "refused: Element 'i:InclusiveNamespaces' has the unexpected attribute 'Prefix'.");
+  EXPECT_EQ(verdict(Replaced(list, "/>", "><x/></i:InclusiveNamespaces>")),
+            "refused: Element 'i:InclusiveNamespaces' holds the unexpected element 'x'.");
+  EXPECT_EQ(verdict("<ds:XPath>false()</ds:XPath>"), takesNo("ds:XPath"));
+  EXPECT_EQ(verdict("<InclusiveNamespaces/>"), takesNo("InclusiveNamespaces"));
+  EXPECT_EQ(verdict("<ds:InclusiveNamespaces/>"), takesNo("ds:InclusiveNamespaces"));
+  EXPECT_EQ(verdict(Replaced(list, "InclusiveNamespaces", "inclusivenamespaces")),
+            takesNo("i:inclusivenamespaces"));
+}
+
+// The namespace of the transform is not one of the canonicalisation's parameters.
+TEST(AlgorithmParametersTest, OfTheExclusiveMethodAreInItsOwnNamespace) {
+  const std::string list =
+      "<i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2000/09/xmldsig#enveloped-signature\"/>";
+  EXPECT_EQ(Verdict(WithPrefixList(list)),
+            "refused: The algorithm 'http://www.w3.org/2001/10/xml-exc-c14n#' does not take "
+            "'i:InclusiveNamespaces' as a parameter.");
+}
+
+TEST(AlgorithmParametersTest, OfTheExclusiveMethodHaveOneExpandedName) {
+  const std::string start =
+      "refused: The algorithm 'http://www.w3.org/2001/10/xml-exc-c14n#' does "
+      "not take ";
+  EXPECT_EQ(Verdict(WithPrefixList("<c:InclusiveNamespaces xmlns:c=\"urn:other\"/>")),
+            start + "'c:InclusiveNamespaces' as a parameter.");
+  EXPECT_EQ(Verdict(WithPrefixList(
+                "<c:Other xmlns:c=\"http://www.w3.org/2001/10/xml-exc-c14n#\" PrefixList=\"\"/>")),
+            start + "'c:Other' as a parameter.");
+}
+
+TEST(AlgorithmParametersTest, AreRefusedForTheInclusiveMethod) {
+  SignatureTemplate signature;
+  signature.transforms = Transforms({kEnveloped, kInclusive});
+  const std::string text = AssertionWithValues(signature);
+  ASSERT_EQ(Verdict(text), "invalid");
+  const std::string list =
+      "<c:InclusiveNamespaces xmlns:c=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>";
+  EXPECT_EQ(
+      Verdict(Replaced(text, "REC-xml-c14n-20010315\"/></ds:Transforms>",
+                       "REC-xml-c14n-20010315\">" + list + "</ds:Transform></ds:Transforms>")),
+      "refused: The algorithm 'http://www.w3.org/TR/2001/REC-xml-c14n-20010315' takes no "
+      "parameters, but has 'c:InclusiveNamespaces'.");
+}
+
 TEST(AlgorithmParametersTest, PrefixListsAreSplitAtWhiteSpace) {
   const auto document = ParseXml(
       "<t><i:InclusiveNamespaces xmlns:i=\"http://www.w3.org/2001/10/xml-exc-c14n#\" "
-      "PrefixList=\"  a&#10;b&#9;#default  c \"/></t>");
+      "PrefixList=\"  a&#10;b&#9;#default&#13;d  c \"/></t>");
   const C14nOptions options = LookUpCanonicalizationMethod(kExclusive, document->RootElement());
   EXPECT_TRUE(options.exclusive);
-  EXPECT_THAT(options.inclusivePrefixes, testing::ElementsAre("a", "b", "#default", "c"));
+  EXPECT_THAT(options.inclusivePrefixes, testing::ElementsAre("a", "b", "#default", "d", "c"));
 }
 
 TEST(AlgorithmsTest, BoundsAndSanitisesWhatItQuotes) {
@@ -218,6 +315,18 @@ TEST(AlgorithmsTest, BoundsAndSanitisesWhatItQuotes) {
   const std::string verdict = Verdict(AssertionWithValues(signature));
   EXPECT_THAT(verdict, testing::StartsWith("refused: The signature algorithm '???xxx"));
   EXPECT_LT(verdict.size(), 250U);
+}
+
+TEST(FindDigestMethodTest, KnowsTheListedAlgorithms) {
+  EXPECT_EQ(FindDigestMethod("http://www.w3.org/2001/04/xmlenc#sha256"), Crypto::Hash::kSha256);
+  EXPECT_EQ(FindDigestMethod("http://www.w3.org/2001/04/xmldsig-more#sha384"),
+            Crypto::Hash::kSha384);
+  EXPECT_EQ(FindDigestMethod("http://www.w3.org/2001/04/xmlenc#sha512"), Crypto::Hash::kSha512);
+  for (const char* algorithm :
+       {"", "http://www.w3.org/2000/09/xmldsig#sha1", "http://www.w3.org/2001/04/xmlenc#SHA256",
+        "http://www.w3.org/2001/04/xmlenc#sha256 "}) {
+    EXPECT_EQ(FindDigestMethod(algorithm), std::nullopt) << algorithm;
+  }
 }
 
 }  // namespace

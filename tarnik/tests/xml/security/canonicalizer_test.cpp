@@ -52,6 +52,16 @@ TEST(CanonicalizerTest, ComparesTheWholeAlgorithmUri) {
   }
 }
 
+// Canonical XML 1.0, section 2.3, "Namespace Axis".
+TEST(CanonicalizerTest, NeverDeclaresThePrefixXml) {
+  const std::string text =
+      "<a xmlns:xml=\"http://www.w3.org/XML/1998/namespace\" xml:lang=\"en\"></a>";
+  for (const char* algorithm : {kInclusive, kExclusive}) {
+    EXPECT_EQ(Canonical(text, algorithm), "<a xml:lang=\"en\"></a>");
+  }
+  EXPECT_EQ(Canonical(ParseXml(text).get(), kExclusive, {"xml"}), "<a xml:lang=\"en\"></a>");
+}
+
 TEST(CanonicalizerTest, AcceptsPrefixesOnlyForTheExclusiveMethod) {
   EXPECT_THROW(CreateCanonicalizer(kInclusive, {"p"}), XmlSecurityException);
   EXPECT_NO_THROW(CreateCanonicalizer(kExclusive, {"p"}));

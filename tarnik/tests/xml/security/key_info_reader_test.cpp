@@ -102,13 +102,39 @@ INSTANTIATE_TEST_SUITE_P(
              "expected."},
         Case{"AttributeOfCertificate",
              "<X509Data><X509Certificate Id=\"x\">AAAA</X509Certificate></X509Data>",
-             "Element 'X509Certificate' has the unexpected attribute 'Id'."}),
+             "Element 'X509Certificate' has the unexpected attribute 'Id'."},
+        Case{"MoreInIssuerSerial",
+             "<X509Data><X509IssuerSerial><X509IssuerName>CN=a</X509IssuerName>"
+             "<X509SerialNumber>1</X509SerialNumber><X509SerialNumber>2</X509SerialNumber>"
+             "</X509IssuerSerial></X509Data>",
+             "Element 'X509IssuerSerial' holds the unexpected element 'X509SerialNumber'."}),
     [](const auto& tested) { return tested.param.name; });
 
 TEST(KeyInfoReaderTest, RefusesUnknownAttributes) {
   EXPECT_EQ(ReadError("<KeyName/>", " Type=\"x\""),
             "Element 'KeyInfo' has the unexpected attribute 'Type'.");
   EXPECT_EQ(ReadError("<KeyName/>"), "accepted");
+}
+
+TEST(KeyInfoReaderTest, RefusesUnknownAttributesOfItsParts) {
+  const std::string content =
+      "<KeyName>n</KeyName><X509Data><X509IssuerSerial><X509IssuerName>CN=a</X509IssuerName>"
+      "<X509SerialNumber>1</X509SerialNumber></X509IssuerSerial><X509SKI>AQI=</X509SKI>"
+      "<X509SubjectName>CN=b</X509SubjectName><X509Certificate>AQID</X509Certificate></X509Data>";
+  ASSERT_EQ(ReadError(content), "accepted");
+  for (const std::string element :
+       {"KeyName", "X509Data", "X509IssuerSerial", "X509IssuerName", "X509SerialNumber", "X509SKI",
+        "X509SubjectName", "X509Certificate"}) {
+    std::string edited = content;
+    edited.insert(edited.find("<" + element + ">") + 1 + element.size(), " Id=\"x\"");
+    EXPECT_EQ(ReadError(edited), "Element '" + element + "' has the unexpected attribute 'Id'.");
+  }
+}
+
+// Only the expanded name refers to a key elsewhere.
+TEST(KeyInfoReaderTest, SkipsElementsThatShareHalfTheNameOfAReference) {
+  EXPECT_EQ(ReadError("<o:KeyInfoReference xmlns:o=\"urn:other\"/>"), "accepted");
+  EXPECT_EQ(ReadError("<d:Other xmlns:d=\"http://www.w3.org/2009/xmldsig11#\"/>"), "accepted");
 }
 
 }  // namespace

@@ -2,11 +2,13 @@
 #include <utility>
 #include <vector>
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <tarnik/core/exception.h>
 #include <tarnik/xml/security/key_info_resolver.h>
 
+#include "support/key_info_texts.h"
 #include "support/openssl.h"
 #include "support/test_certificates.h"
 
@@ -16,6 +18,8 @@ namespace {
 using namespace Tarnik::Xml;
 using namespace Tarnik::Xml::Security;
 using Crypto::Certificate;
+using testing::ElementsAre;
+using testing::IsEmpty;
 
 class Resolvers : public testing::Test {
  protected:
@@ -99,6 +103,13 @@ TEST_F(TrustedCertificatesResolverTest, FindsBySubjectName) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
 }
 
+TEST_F(TrustedCertificatesResolverTest, CountsACertificateThatIsGivenTwiceOnce) {
+  const auto resolver = CreateTrustedCertificatesResolver({first_, second_, first_});
+  KeyInfo keyInfo;
+  keyInfo.subjectNames = {first_->SubjectName()};
+  EXPECT_EQ(resolver->Resolve(keyInfo), first_->GetPublicKey());
+}
+
 TEST_F(TrustedCertificatesResolverTest, ReturnsNoKeyWhenAHintNamesSeveralCertificates) {
   KeyInfo keyInfo;
   keyInfo.subjectNames = {first_->SubjectName(), second_->SubjectName()};
@@ -114,6 +125,28 @@ TEST_F(TrustedCertificatesResolverTest, NeedsNoHintWhenOnlyOneCertificateIsTrust
   EXPECT_EQ(single->Resolve(keyInfo), first_->GetPublicKey());
   keyInfo.keyNames = {"whatever"};
   EXPECT_EQ(single->Resolve(keyInfo), first_->GetPublicKey());
+}
+
+TEST_F(TrustedCertificatesResolverTest, ReturnsAllCandidates) {
+  const auto& candidates = dynamic_cast<const KeyCandidatesResolver&>(*resolver_);
+  const auto first = first_->GetPublicKey();
+  const auto second = second_->GetPublicKey();
+  KeyInfo keyInfo;
+  EXPECT_THAT(candidates.Candidates(keyInfo), ElementsAre(first, second));
+  keyInfo.subjectNames = {second_->SubjectName(), first_->SubjectName()};
+  EXPECT_THAT(candidates.Candidates(keyInfo), ElementsAre(first, second));
+  keyInfo.subjectNames = {"cn=SECOND, o=\"test, inc.\""};
+  EXPECT_THAT(candidates.Candidates(keyInfo), ElementsAre(second));
+  keyInfo.subjectNames = {"CN=nobody"};
+  EXPECT_THAT(candidates.Candidates(keyInfo), IsEmpty());
+}
+
+TEST_F(TrustedCertificatesResolverTest, ReturnsTheKeyThatTheMessageContains) {
+  EXPECT_EQ(resolver_->Resolve(ReadHints(DerEncodedKey(*second_))), second_->GetPublicKey());
+  EXPECT_EQ(resolver_->Resolve(ReadHints(DigestOf(*first_, kSha256Uri, Crypto::Hash::kSha256))),
+            first_->GetPublicKey());
+  const auto alien = MakeCertificate({.key = MakeEcKey("P-256").get()});
+  EXPECT_EQ(resolver_->Resolve(ReadHints(DerEncodedKey(*alien))), nullptr);
 }
 
 TEST_F(TrustedCertificatesResolverTest, IgnoresBrokenCertificates) {
@@ -133,12 +166,31 @@ TEST_F(CertificateIssuerResolverTest, FindsByTheIssuerThatIsNamed) {
   EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
 }
 
+TEST_F(CertificateIssuerResolverTest, ReadsTheIssuersNameInAnySpelling) {
+  KeyInfo keyInfo;
+  for (const char* name : {"cn=CA, O=\"Test, Inc.\"", "2.5.4.3=#0c026361;O=Test\\2C Inc."}) {
+    keyInfo.issuerSerials = {{name, "2"}};
+    EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey()) << name;
+  }
+  for (const char* name : {"CN=ca,O=Test, Inc.", "O=Test\\, Inc.,CN=ca", "CN=c a,O=Test\\, Inc."}) {
+    keyInfo.issuerSerials = {{name, "2"}};
+    EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr) << name;
+  }
+}
+
 TEST_F(CertificateIssuerResolverTest, FindsByTheIssuerOfAnEmbeddedCertificate) {
   KeyInfo keyInfo;
   keyInfo.certificates = {DerOf(first_)};
   EXPECT_EQ(resolver_->Resolve(keyInfo), first_->GetPublicKey());
   keyInfo.certificates = {DerOf(stranger_)};
   EXPECT_EQ(resolver_->Resolve(keyInfo), nullptr);
+}
+
+TEST_F(CertificateIssuerResolverTest, IgnoresACertificateNextToANamedIssuer) {
+  KeyInfo keyInfo;
+  keyInfo.issuerSerials = {{second_->IssuerName(), "2"}};
+  keyInfo.certificates = {DerOf(first_)};
+  EXPECT_EQ(resolver_->Resolve(keyInfo), second_->GetPublicKey());
 }
 
 TEST_F(CertificateIssuerResolverTest, ReturnsTheTrustedKeyForAStrangerWithTheSameIssuer) {

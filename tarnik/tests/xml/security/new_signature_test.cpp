@@ -164,6 +164,8 @@ TEST(NewSignatureTest, RefusesKeyInfoThatAReaderWouldRefuse) {
   EXPECT_EQ(Refusal([&] { request.signature->SetKeyInfo(request.signature->Element()); }), none);
   const std::string made = request.SignedText();
   EXPECT_THAT(request.signature->KeyInfo().keyNames, testing::ElementsAre("me"));
+  EXPECT_THAT(made, testing::HasSubstr("<ds:KeyInfo><ds:KeyName>me</ds:KeyName></ds:KeyInfo>"
+                                       "</ds:Signature>"));
   EXPECT_EQ(Verdict(made), "valid");
 }
 
@@ -185,6 +187,16 @@ TEST(NewSignatureTest, RefusesItsOwnPartsAsKeyInfo) {
   request.signature->Sign(SignerKey().get());
   request.Place();
   EXPECT_EQ(Verdict(request.Text()), "valid");
+}
+
+TEST(NewSignatureTest, RefusesAnElementAroundItselfAsKeyInfo) {
+  Request request;
+  request.Reference("#body");
+  request.Place();
+  const std::string blank = request.Text();
+  EXPECT_EQ(Refusal([&] { request.signature->SetKeyInfo(request.document->RootElement()); }),
+            "argument: The content of KeyInfo must be an element outside of the signature.");
+  EXPECT_EQ(request.Text(), blank);
 }
 
 TEST(NewSignatureTest, RefusesAKeyInfoThatContainsASignedElement) {

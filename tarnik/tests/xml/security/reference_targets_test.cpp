@@ -86,6 +86,33 @@ TEST(ReferenceTargetsTest, AreFoundByEveryIdAttribute) {
   }
 }
 
+/// The same with made-up values, for attributes that the oracle does not know.
+std::string MadeUpWithId(const std::string& attribute) {
+  const std::string text =
+      Replaced(SignedWithId(attribute), "<ds:DigestValue>", "<ds:DigestValue>AAAA");
+  return Replaced(text, "<ds:SignatureValue>", "<ds:SignatureValue>AAAA");
+}
+
+TEST(ReferenceTargetsTest, AreFoundByIdsInLowerCase) {
+  // The last one is one element with the same id twice.
+  for (const char* attribute : {"ID", "id", "xml:id", "ID=\"_b2\" xml:id"}) {
+    EXPECT_EQ(Verdict(MadeUpWithId(attribute)), "invalid") << attribute;
+  }
+}
+
+TEST(ReferenceTargetsTest, AreNotFoundByPrefixedAttributesOfOtherNames) {
+  const std::string wsu =
+      "xmlns:u=\"http://docs.oasis-open.org/wss/2004/01/"
+      "oasis-200401-wss-wssecurity-utility-1.0.xsd\" ";
+  for (const std::string& attribute :
+       {std::string("xmlns:u=\"urn:u\" u:Id"), std::string("xmlns:u=\"urn:u\" u:id"),
+        std::string("xml:Id"), std::string("xml:ID"), wsu + "u:ID", wsu + "u:id"}) {
+    EXPECT_EQ(Verdict(MadeUpWithId(attribute)),
+              "refused: No element has the id '_b2' of a reference.")
+        << attribute;
+  }
+}
+
 class ReferenceUriTest : public testing::TestWithParam<const char*> {};
 
 TEST_P(ReferenceUriTest, OfAnotherFormIsRefused) {

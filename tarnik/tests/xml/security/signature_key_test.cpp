@@ -1,5 +1,4 @@
 #include <string>
-#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -9,6 +8,7 @@
 #include <tarnik/crypto/public_key.h>
 #include <tarnik/xml/security/key_info_resolver.h>
 
+#include "support/one_key_resolver.h"
 #include "support/openssl.h"
 #include "support/signed_documents.h"
 #include "support/test_certificates.h"
@@ -81,17 +81,8 @@ TEST(SignatureKeyTest, OfRsaBelow2048BitsIsRefused) {
             "refused: The trusted RSA key has 1024 bits; at least 2048 are needed.");
 }
 
-class FixedKeyResolver final : public KeyInfoResolver, public ObjectImpl {
- public:
-  explicit FixedKeyResolver(Ref<const Crypto::PublicKey> key) : key_(std::move(key)) {}
-  Ref<const Crypto::PublicKey> Resolve(const Security::KeyInfo&) const override { return key_; }
-
- private:
-  Ref<const Crypto::PublicKey> key_;
-};
-
 Ref<const KeyInfoResolver> ResolverFor(EVP_PKEY* key) {
-  return MakeRef<FixedKeyResolver>(MakeCertificate({.key = key})->GetPublicKey());
+  return MakeRef<OneKeyResolver>(MakeCertificate({.key = key})->GetPublicKey());
 }
 
 TEST(SignatureKeyTest, OnAnotherCurveIsRefused) {
@@ -129,7 +120,7 @@ class ForeignKey final : public Crypto::PublicKey, public ObjectImpl {
 };
 
 TEST(SignatureKeyTest, OfAnotherImplementationIsRefused) {
-  const auto resolver = MakeRef<FixedKeyResolver>(MakeRef<ForeignKey>());
+  const auto resolver = MakeRef<OneKeyResolver>(MakeRef<ForeignKey>());
   EXPECT_EQ(Verdict(Signed(), resolver.get()),
             "refused: The trusted key was not made by this library.");
 }
@@ -137,7 +128,7 @@ TEST(SignatureKeyTest, OfAnotherImplementationIsRefused) {
 TEST(SignatureKeyTest, IsRequired) {
   EXPECT_EQ(Verdict(Signed(), nullptr),
             "refused: A signature cannot be verified without a key resolver.");
-  EXPECT_EQ(Verdict(Signed(), MakeRef<FixedKeyResolver>(nullptr).get()), NoTrustedKeyFor(Signer()));
+  EXPECT_EQ(Verdict(Signed(), MakeRef<OneKeyResolver>(nullptr).get()), NoTrustedKeyFor(Signer()));
 }
 
 class ThrowingResolver final : public KeyInfoResolver, public ObjectImpl {

@@ -1,5 +1,6 @@
 #include "xml/security/signature_reader.h"
 
+#include <algorithm>
 #include <cstddef>
 #include <string>
 #include <string_view>
@@ -7,7 +8,12 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <tarnik/xml/security/signature.h>
+#include <tarnik/xml/security/xml_security_exception.h>
+
 #include "support/signed_documents.h"
+#include "support/thrown_message.h"
+#include "support/xml_text.h"
 
 namespace Tarnik::Testing {
 namespace {
@@ -203,6 +209,29 @@ TEST(SignatureReaderTest, AcceptsIdsAndNamespaceDeclarations) {
   EXPECT_EQ(Verdict(Replaced(Good(), "<ds:SignatureValue",
                              "<ds:SignatureValue Id=\"v\" xmlns:x=\"urn:x\"")),
             "valid");
+}
+
+TEST(SignatureReaderTest, RefusesUnknownAttributesOfEveryElement) {
+  for (const std::string element :
+       {"Signature", "SignedInfo", "CanonicalizationMethod", "SignatureMethod", "Reference",
+        "Transforms", "Transform", "DigestMethod", "DigestValue", "SignatureValue", "KeyInfo",
+        "X509Data", "X509Certificate"}) {
+    const std::string open = "<ds:" + element;
+    std::string text = Good();
+    const std::size_t start = std::min(text.find(open + " "), text.find(open + ">"));
+    ASSERT_NE(start, std::string::npos) << element;
+    text.insert(start + open.size(), " Other=\"x\"");
+    EXPECT_EQ(Verdict(text),
+              "syntax: Element 'ds:" + element + "' has the unexpected attribute 'Other'.");
+  }
+}
+
+TEST(SignatureReaderTest, RefusesAnotherElementOfItsNamespace) {
+  const auto document =
+      ParseXml("<ds:SignedInfo xmlns:ds=\"http://www.w3.org/2000/09/xmldsig#\"/>");
+  EXPECT_EQ(ThrownMessage<SignatureSyntaxException>(
+                [&] { CreateSignatureFromDom(document->RootElement()); }, "accepted"),
+            "Element 'ds:SignedInfo' is not the Signature of XML-Signature.");
 }
 
 std::string WithReferences(std::size_t count) {

@@ -271,6 +271,21 @@ TEST_F(EcdsaSignatureTest, FailsForDegenerateValues) {
   EXPECT_EQ(VerdictWith(shorter), "invalid");
 }
 
+// Two of the signature's numbers do not both begin with so many zeros by chance.
+TEST_F(EcdsaSignatureTest, FailsForHalvesThatLackDigits) {
+  for (const std::size_t half : {std::size_t{28}, std::size_t{16}, std::size_t{1}}) {
+    for (const std::size_t from : {std::size_t{0}, 32 - half}) {
+      std::vector<unsigned char> shorter;
+      for (const std::size_t start : {std::size_t{0}, std::size_t{32}}) {
+        const auto first = value_.begin() + static_cast<std::ptrdiff_t>(start + from);
+        shorter.insert(shorter.end(), first, first + static_cast<std::ptrdiff_t>(half));
+      }
+      EXPECT_EQ(VerdictWith(shorter), "invalid") << half << " from " << from;
+    }
+  }
+  EXPECT_EQ(VerdictWith({1, 1}), "invalid");
+}
+
 TEST_F(EcdsaSignatureTest, FailsWhenEncodedInDer) {
   const OpenSsl::OwnedEcdsaSignature numbers(ECDSA_SIG_new());
   ASSERT_EQ(ECDSA_SIG_set0(numbers.get(), BN_bin2bn(value_.data(), 32, nullptr),

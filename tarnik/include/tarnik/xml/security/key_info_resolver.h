@@ -11,7 +11,8 @@
 namespace Tarnik::Xml::Security {
 
 /// Decides which key a signature is verified with. It is the only source of trust in a
-/// verification. Callers may implement it; implementations must be thread-safe.
+/// verification. Callers may implement it; implementations must be thread-safe. `KeyInfo` and
+/// `ReadKeyHints` return what the message says about its key, which is only a hint.
 class TARNIK_EXPORT KeyInfoResolver : public virtual Object {
  public:
   /// The trusted key for a signature with `keyInfo`, or null when there is no trusted key. Its
@@ -19,19 +20,41 @@ class TARNIK_EXPORT KeyInfoResolver : public virtual Object {
   virtual Ref<const Crypto::PublicKey> Resolve(const KeyInfo& keyInfo) const = 0;
 };
 
-/// Trusts exactly `certificates`. A signature with certificates or other X.509 hints is verified
-/// with the trusted certificate that they name. Only the first kind of hint that is present is
-/// used, in this order: certificates (one must equal a trusted one byte for byte), issuer and
-/// serial number, subject key identifier, subject name. Hints of the last three kinds that name
-/// several trusted certificates select none. A signature without hints is verified if only a single
-/// certificate is trusted. The validity periods of the certificates are not checked. Throws
+/// A resolver that may know several keys for a signature, for example while a signer changes its
+/// key. Callers may implement it; implementations must be thread-safe.
+class TARNIK_EXPORT KeyCandidatesResolver : public KeyInfoResolver {
+ public:
+  /// The trusted keys that a signature with `keyInfo` may have been made with; empty when there is
+  /// no trusted key. A verification calls this function and not `Resolve`. It tries the keys in
+  /// this order, until one verifies the signature value. If there is more than one, it skips keys
+  /// that do not fit the signature algorithm or are too weak, and tries at most 16. Null is
+  /// skipped. Exceptions pass through the verification unchanged.
+  virtual std::vector<Ref<const Crypto::PublicKey>> Candidates(const KeyInfo& keyInfo) const = 0;
+};
+
+/// Trusts exactly `certificates`. What the message says about its key only selects among them:
+///  - Only the first kind of hint that is present is used, in this order: X509Certificate (one must
+///    equal a trusted one byte for byte), X509IssuerSerial, X509SKI, X509SubjectName, X509Digest
+///    with SHA-256, SHA-384 or SHA-512, and keys (KeyValue, DEREncodedKeyValue). A hint that names
+///    no trusted certificate or cannot be read selects none, whatever other kinds say.
+///  - Of each kind, the first 16 hints are used.
+///  - Names are equal as in RFC 5280, section 7.1; their texts may be in the forms of RFC 4514, RFC
+///    2253 and RFC 1779 and those that Java, .NET and OpenSSL write. A certificate without a
+///    SubjectKeyIdentifier has the one of RFC 5280, section 4.2.1.2, method 1.
+///  - If several certificates are selected, their keys are tried as described at
+///    `KeyCandidatesResolver::Candidates`, in the order of the list.
+///  - Without any of these hints, all certificates are selected. KeyName is not a hint, since
+///    certificates have no such names. If the list has only one certificate, X509Digest and keys
+///    are not hints either.
+/// `Resolve` returns the selected key if there is exactly one. The validity periods of the
+/// certificates are not checked. The result also is a `KeyCandidatesResolver`. Throws
 /// `InvalidArgumentException` when the list is empty or contains null.
 TARNIK_EXPORT Ref<const KeyInfoResolver> CreateTrustedCertificatesResolver(
     std::vector<Ref<const Crypto::Certificate>> certificates);
 
 /// As above, but the certificate is selected by the issuer that the KeyInfo names: the
 /// X509IssuerSerial, or else the issuer and serial number of the first certificate in the KeyInfo.
-/// A signature that names no issuer is rejected.
+/// A signature that names no issuer, or several certificates with different keys, is rejected.
 TARNIK_EXPORT Ref<const KeyInfoResolver> CreateCertificateIssuerResolver(
     std::vector<Ref<const Crypto::Certificate>> certificates);
 

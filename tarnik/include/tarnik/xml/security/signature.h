@@ -56,21 +56,26 @@ class TARNIK_EXPORT Signature : public virtual Object {
   virtual ElementNode* Element() const = 0;
 
   /// Verifies the signature value over SignedInfo with the key that `resolver` returns, and then
-  /// the digest of every reference. False when any of them does not match. Nothing is computed
-  /// before all algorithms and references have been validated, and nothing is ever fetched.
+  /// the digest of every reference. False when any of them does not match. If `resolver` is a
+  /// `KeyCandidatesResolver` that returns several keys, at most 16 of them are tried for the
+  /// signature value, and if none has made it, there is no trusted key. Nothing is computed before
+  /// all algorithms and references have been validated, and nothing is ever fetched.
   ///
   /// The supported algorithms are a closed list, compared as whole URIs:
   ///  - signatures: RSA PKCS#1 v1.5, RSA-PSS (RFC 6931, section 2.3.10) and ECDSA on P-256, P-384
-  ///    and P-521, each with SHA-256, SHA-384 or SHA-512; RSA keys of at least 2048 bits;
+  ///    and P-521, each with SHA-256, SHA-384 or SHA-512; RSA keys of at least 2048 bits. An ECDSA
+  ///    value has two halves of equal length, at most that of the order of the curve;
   ///  - digests: SHA-256, SHA-384 and SHA-512;
   ///  - canonicalisations: those of `CreateCanonicalizer`;
   ///  - transforms: enveloped-signature and then one canonicalisation, both optional.
+  /// An InclusiveNamespaces element in enveloped-signature has no effect; other parameters that an
+  /// algorithm does not take are refused.
   ///
   /// The URI of a reference is empty (the whole document) or "#" followed by the id of exactly one
   /// element of the document: an attribute "ID", "Id" or "id", xml:id, or wsu:Id. No second element
-  /// may have that value in an attribute whose local name is "id" in any letter case. The target of
-  /// a reference must either enclose the signature and have the enveloped-signature transform, or
-  /// be outside of it and not have this transform.
+  /// may have that value as its `PossibleId` (`ids.h`). The target of a reference must either
+  /// enclose the signature and have the enveloped-signature transform, or be outside of it and not
+  /// have this transform.
   ///
   /// Throws `XmlSecurityException` when the signature cannot be verified: `resolver` is null, an
   /// algorithm is not on the list, a reference is not as above, there is no trusted key, the key
