@@ -86,6 +86,11 @@ void ResponseParser::Refuse(std::string_view fault) const {
   throw HttpException("The answer from " + peer_ + " " + std::string(fault) + ".");
 }
 
+void ResponseParser::RefuseCutOff(std::string_view part) const {
+  throw CutOffException("The answer from " + peer_ + " was cut off in its " + std::string(part) +
+                        ".");
+}
+
 void ResponseParser::Feed(std::string_view bytes) {
   hasStarted_ = true;
   if (isDone_) {
@@ -185,15 +190,15 @@ void ResponseParser::FeedEnd() {
     return;
   }
   if (!hasStarted_) {
-    throw HttpException(peer_ + " closed the connection without an answer.");
+    throw CutOffException(peer_ + " closed the connection without an answer.");
   }
   if (message_ == nullptr) {
-    Refuse("was cut off in its header");
+    RefuseCutOff("header");
   }
   BeastError error;
   message_->put_eof(error);
   if (error) {
-    Refuse("was cut off in its body");
+    RefuseCutOff("body");
   }
   isDone_ = true;
 }

@@ -24,7 +24,7 @@ class ResponseParser {
   /// Takes the next bytes. Throws `HttpException` for an answer that violates the protocol or a
   /// limit.
   void Feed(std::string_view bytes);
-  /// Takes the orderly end of the connection. Throws `HttpException` when it cuts the answer off.
+  /// Takes the orderly end of the connection. Throws `CutOffException` when it cuts the answer off.
   void FeedEnd();
 
   /// True when the answer is complete.
@@ -43,6 +43,7 @@ class ResponseParser {
   void SkipInterim(int code);
   void CheckOverhead() const;
   [[noreturn]] void Refuse(std::string_view fault) const;
+  [[noreturn]] void RefuseCutOff(std::string_view part) const;
 
   const std::string peer_;
   SensitiveText input_;  // bytes that no message has consumed yet

@@ -80,15 +80,13 @@ void PeerCheck::ApplyTo(SSL* ssl) const {
 bool PeerCheck::OnVerified(bool isValid, X509_STORE_CTX* context) {
   X509* certificate = X509_STORE_CTX_get_current_cert(context);
   if (!isValid) {
-    failure_ = DescribeFailure(X509_STORE_CTX_get_error(context), certificate);
-    return false;
+    return Reject(X509_STORE_CTX_get_error(context), certificate);
   }
   if (X509_STORE_CTX_get_error_depth(context) > 0 || IsPinned(certificate)) {
     return true;
   }
   X509_STORE_CTX_set_error(context, X509_V_ERR_APPLICATION_VERIFICATION);
-  failure_ = DescribeFailure(X509_V_ERR_APPLICATION_VERIFICATION, certificate);
-  return false;
+  return Reject(X509_V_ERR_APPLICATION_VERIFICATION, certificate);
 }
 
 bool PeerCheck::IsAccepted(const SSL* ssl) {
@@ -99,12 +97,10 @@ bool PeerCheck::IsAccepted(const SSL* ssl) {
   }
   const long result = SSL_get_verify_result(ssl);
   if (result != X509_V_OK) {
-    failure_ = DescribeFailure(static_cast<int>(result), certificate);
-    return false;
+    return Reject(static_cast<int>(result), certificate);
   }
   if (!IsPinned(certificate)) {
-    failure_ = DescribeFailure(X509_V_ERR_APPLICATION_VERIFICATION, certificate);
-    return false;
+    return Reject(X509_V_ERR_APPLICATION_VERIFICATION, certificate);
   }
   return true;
 }
@@ -120,6 +116,12 @@ bool PeerCheck::IsPinned(X509* certificate) const {
            return std::equal(der, der + length, pinned->DerBytes(),
                              pinned->DerBytes() + pinned->DerLength());
          });
+}
+
+bool PeerCheck::Reject(int error, X509* certificate) {
+  isOtherPeer_ = IsMismatch(error);
+  failure_ = DescribeFailure(error, certificate);
+  return false;
 }
 
 std::string PeerCheck::DescribeFailure(int error, X509* certificate) const {

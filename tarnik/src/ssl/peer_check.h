@@ -31,17 +31,21 @@ class PeerCheck {
 
   /// Why the peer was rejected; empty if it was not.
   const std::string& Failure() const noexcept { return failure_; }
+  /// True when it was rejected because it is another peer.
+  bool IsOtherPeer() const noexcept { return isOtherPeer_; }
 
   /// Called for each step of a verification with OpenSSL's result; returns the final result.
   bool OnVerified(bool isValid, X509_STORE_CTX* context);
 
  private:
   bool IsPinned(X509* certificate) const;
+  bool Reject(int error, X509* certificate);
   std::string DescribeFailure(int error, X509* certificate) const;
 
   const std::string expected_;
   const PinnedCertificates& pinned_;
   std::string failure_;
+  bool isOtherPeer_ = false;
 };
 
 }  // namespace Tarnik::Ssl

@@ -160,12 +160,16 @@ void TlsEngine::FailAtEndOfInput() const {
   if (!isHandshakeDone_) {
     throw HandshakeError(notTls_ == nullptr ? "the peer closed the connection" : notTls_);
   }
-  throw SSLException("The TLS connection with " + peer_ +
-                     " was closed without close_notify: the data may be cut off.");
+  throw TruncationException("The TLS connection with " + peer_ +
+                            " was closed without close_notify: the data may be cut off.");
 }
 
 SSLException TlsEngine::HandshakeError(const std::string& cause) const {
-  return SSLException("TLS handshake with " + peer_ + " failed: " + cause);
+  return SSLException(DescribeHandshake(cause));
+}
+
+std::string TlsEngine::DescribeHandshake(const std::string& cause) const {
+  return "TLS handshake with " + peer_ + " failed: " + cause;
 }
 
 void TlsEngine::Fail(const std::string& operation) {
@@ -175,9 +179,19 @@ void TlsEngine::Fail(const std::string& operation) {
     throw HandshakeError(notTls_);
   }
   if (!isHandshakeDone_) {
-    throw HandshakeError(check_.Failure().empty() ? reason : check_.Failure());
+    FailHandshake(reason);
   }
   throw SSLException(operation + " the TLS connection with " + peer_ + ": " + reason);
+}
+
+void TlsEngine::FailHandshake(const std::string& reason) const {
+  if (check_.Failure().empty()) {
+    throw HandshakeError(reason);
+  }
+  if (check_.IsOtherPeer()) {
+    throw PeerNameException(DescribeHandshake(check_.Failure()));
+  }
+  throw PeerTrustException(DescribeHandshake(check_.Failure()));
 }
 
 void TlsEngine::InstallCallbacks(SSL_CTX* context) {

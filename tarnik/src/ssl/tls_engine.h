@@ -54,6 +54,8 @@ class TlsEngine {
   void Resume();
   void ExamineStart(const char* data, std::size_t size);
   [[noreturn]] void Fail(const std::string& operation);
+  [[noreturn]] void FailHandshake(const std::string& reason) const;
+  std::string DescribeHandshake(const std::string& cause) const;
 
   const Ref<SSLContextImpl> context_;
   const std::string peer_;

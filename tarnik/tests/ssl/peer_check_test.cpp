@@ -19,6 +19,15 @@ namespace {
 
 using namespace Tarnik::Ssl;
 
+/// Checks that the class of a handshake's failure shows whether the peer is another one.
+void ExpectClassFor(const TlsClient& client) {
+  const std::string message = client.Message();
+  const bool isOtherPeer = message.find(" does not name ") != std::string::npos;
+  EXPECT_EQ(client.Handshake().IsError<PeerNameException>(), isOtherPeer) << message;
+  EXPECT_EQ(client.Handshake().IsError<PeerTrustException>(), !message.empty() && !isOtherPeer)
+      << message;
+}
+
 /// The message of a handshake with a server whose certificate is made by `options` and issued by
 /// the trusted root; empty when it succeeds.
 std::string HandshakeWith(const IdentityOptions& options, const std::string& host,
@@ -29,7 +38,7 @@ std::string HandshakeWith(const IdentityOptions& options, const std::string& hos
   TlsServer server(peer, 1);
   const auto context = TrustingContext(TestPki::Get().root);
   const TlsClient client(*context, server.Port(), host, serverName);
-  EXPECT_EQ(client.Handshake().IsError<SSLException>(), !client.Message().empty());
+  ExpectClassFor(client);
   EXPECT_EQ(client.Handshake().Count(), 1);
   return client.Message();
 }
@@ -177,7 +186,9 @@ std::string HandshakeWithPins(const std::vector<const Identity*>& pins) {
   peer.identity = &TestPki::Get().leaf;
   TlsServer server(peer, 1);
   const auto context = CreateSSLContext(config);
-  return TlsClient(*context, server.Port()).Message();
+  const TlsClient client(*context, server.Port());
+  ExpectClassFor(client);
+  return client.Message();
 }
 
 TEST(PeerCheckTest, AcceptsOnlyAPinnedCertificate) {

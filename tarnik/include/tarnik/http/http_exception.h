@@ -18,6 +18,17 @@ class TARNIK_EXPORT HttpException : public IOException {
   [[noreturn]] void Throw() const override;
 };
 
+/// An answer that is incomplete because the peer ended the connection, or did so without an answer
+/// (RFC 9112, section 8).
+class TARNIK_EXPORT CutOffException : public HttpException {
+ public:
+  explicit CutOffException(std::string message,
+                           const boost::source_location& where = CurrentLocation());
+  ~CutOffException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
 }  // namespace Tarnik::Http
 
 #endif

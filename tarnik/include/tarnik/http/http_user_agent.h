@@ -36,8 +36,9 @@ TARNIK_EXPORT Ref<ConnectionPool> CreateConnectionPool();
 /// request is ever sent twice: when the peer closes an idle connection at the moment of the next
 /// request, that exchange fails (RFC 9110, section 9.2.2).
 ///
-/// An exchange fails with `HttpException` when the answer violates RFC 9112, is ambiguous, exceeds
-/// a limit, or is cut off; failures of the stream are reported unchanged.
+/// An exchange fails with `HttpException` when the answer violates RFC 9112, is ambiguous or
+/// exceeds a limit, and with `CutOffException` when it is cut off; failures of the stream are
+/// reported unchanged.
 class TARNIK_EXPORT UserAgent : public virtual Object {
  public:
   using Completion = std::function<void(Exception*, ClientResponse*, PendingRequestItem*)>;

@@ -13,10 +13,10 @@
 namespace Tarnik::Ssl {
 
 /// A TLS connection over another stream. `Close` closes the stream below. When the stream below
-/// ends without the peer's close_notify, a read fails with an `SSLException`, so that truncated
-/// data is never taken for complete data (RFC 8446, section 6.1). A shortage of memory on an I/O
-/// thread fails the connection; what leaves a completion of the caller ends the process, and a
-/// forked child cannot use the stream of its parent, as `Stream` says.
+/// ends without the peer's close_notify, a read fails with a `TruncationException`, so that
+/// truncated data is never taken for complete data (RFC 8446, section 6.1). A shortage of memory on
+/// an I/O thread fails the connection; what leaves a completion of the caller ends the process, and
+/// a forked child cannot use the stream of its parent, as `Stream` says.
 class TARNIK_EXPORT SSLStream : public System::Stream {
  public:
   using HandshakeCompletion = std::function<void(Exception* error)>;

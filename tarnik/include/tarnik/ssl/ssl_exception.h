@@ -19,6 +19,40 @@ class TARNIK_EXPORT SSLException : public IOException {
   [[noreturn]] void Throw() const override;
 };
 
+/// A handshake that failed because the peer's certificate is not trusted: its issuer is unknown, it
+/// is expired, not yet valid, revoked, not meant for servers or not pinned, its revocation cannot
+/// be determined, or the peer has none (RFC 5280, section 6).
+class TARNIK_EXPORT PeerTrustException : public SSLException {
+ public:
+  explicit PeerTrustException(std::string message,
+                              const boost::source_location& where = CurrentLocation());
+  ~PeerTrustException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// A handshake that failed because the peer's certificate is for another name or address (RFC 9525,
+/// section 6). It may be unacceptable for other reasons, too.
+class TARNIK_EXPORT PeerNameException : public SSLException {
+ public:
+  explicit PeerNameException(std::string message,
+                             const boost::source_location& where = CurrentLocation());
+  ~PeerNameException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// A connection whose peer ended it after the handshake without close_notify, so that the data may
+/// be cut off (RFC 8446, section 6.1).
+class TARNIK_EXPORT TruncationException : public SSLException {
+ public:
+  explicit TruncationException(std::string message,
+                               const boost::source_location& where = CurrentLocation());
+  ~TruncationException() override;
+  std::unique_ptr<Throwable> Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
 }  // namespace Tarnik::Ssl
 
 #endif

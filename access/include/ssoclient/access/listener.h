@@ -1,0 +1,107 @@
+#ifndef SSOCLIENT_ACCESS_LISTENER_H
+#define SSOCLIENT_ACCESS_LISTENER_H
+
+#include <chrono>
+#include <cstdint>
+#include <memory>
+#include <string>
+
+#include <boost/optional.hpp>
+
+#include <ssoclient/access/export.h>
+#include <ssoclient/access/failure_kind.h>
+#include <tarnik/system/date_time.h>
+
+namespace SsoClient::Access {
+
+/// What an attempt asks the service for.
+enum class AttemptOperation { kLogin, kRenewal, kExchange };
+
+/// One request, or one negotiation, at one endpoint.
+struct AttemptRecord {
+  std::string source;    ///< `TokenSourceConfig::name`
+  std::uint64_t id = 0;  ///< the same when it begins and when it ends; unique in the source
+  std::string endpoint;  ///< the URL as configured
+  AttemptOperation operation = AttemptOperation::kLogin;
+  bool isRefresh = false;  ///< begun in the background, for a key that has a usable token
+  int number = 1;          ///< 1 for the first attempt of a request, 2 for the second
+  /// The rest is set when the attempt has ended.
+  std::chrono::microseconds duration{0};
+  FailureKind failure = FailureKind::kNone;
+  /// Of the failure, without control characters and without the password, and at most 1000 bytes
+  /// long; empty without a failure.
+  std::string message;
+  int httpStatus = 0;  ///< of the last answer; 0 without an answer
+};
+
+enum class CircuitState { kClosed, kOpen, kHalfOpen };
+
+/// An endpoint's circuit has changed.
+struct CircuitRecord {
+  std::string source;
+  std::string endpoint;
+  CircuitState state = CircuitState::kClosed;
+  std::chrono::milliseconds retryAfter{0};  ///< for an open circuit, until the next probe
+};
+
+/// The `Date` of an endpoint's answers began, or ceased, to differ from this system's clock by more
+/// than 30 seconds.
+struct ClockRecord {
+  std::string source;
+  std::string endpoint;
+  std::chrono::milliseconds offset{0};  ///< the service's clock minus this system's
+};
+
+/// A field of an issued token that is not what the request asked for. The token is handed out
+/// nevertheless, as the client does. Compared are
+///  - "subject": with a user name of the form "name@domain", the subject of the token to renew or
+///  to
+///    exchange, or that of the act-as token;
+///  - "audiences": as sets;
+///  - "lifetime": from the answer to the end, by the service's clock, if it differs by more than
+///  two
+///    seconds, a hundredth and the duration of the exchange;
+///  - "confirmation": bearer or holder-of-key, and the key;
+///  - "delegable" and "renewable".
+struct DeviationRecord {
+  std::string source;
+  std::string endpoint;
+  std::string field;      ///< as listed above
+  std::string requested;  ///< as text
+  std::string issued;     ///< as text
+};
+
+/// A refresh has failed, and the last token is served until it is no longer usable; or the first
+/// request for a token of `TokenSourceConfig::keepFresh` has failed.
+struct RefreshFailureRecord {
+  std::string source;
+  FailureKind failure = FailureKind::kNone;
+  std::string message;
+  /// None when there is no token.
+  boost::optional<Tarnik::System::DateTime> usableUntil{};
+  std::chrono::milliseconds nextAttempt{0};  ///< from now
+};
+
+/// Sees what a token source does. Records never contain a password, a key, or the text of a token.
+/// The functions do nothing unless they are overridden. They run on worker threads of the platform
+/// (on others only when no worker can be started), several at once, should return quickly, and must
+/// not throw or call the source. Later versions
+/// add no functions here, but may add an interface that is derived from this one.
+class SSOCLIENT_ACCESS_EXPORT AccessListener {
+ public:
+  virtual ~AccessListener();
+  virtual void OnAttemptBegun(const AttemptRecord& attempt);
+  virtual void OnAttemptEnded(const AttemptRecord& attempt);
+  virtual void OnRefreshFailed(const RefreshFailureRecord& refresh);
+  virtual void OnCircuit(const CircuitRecord& circuit);
+  virtual void OnClock(const ClockRecord& clock);
+  virtual void OnDeviation(const DeviationRecord& deviation);
+};
+
+/// Writes a line to the log of the platform for each record: failures at level 3, refused logins at
+/// level 2, circuits, clocks and deviations at level 4, other attempts at level 6.
+SSOCLIENT_ACCESS_EXPORT std::shared_ptr<AccessListener> CreateLogListener();
+
+}  // namespace SsoClient::Access
+
+#endif

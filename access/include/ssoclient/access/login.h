@@ -1,0 +1,58 @@
+#ifndef SSOCLIENT_ACCESS_LOGIN_H
+#define SSOCLIENT_ACCESS_LOGIN_H
+
+#include <functional>
+#include <memory>
+#include <string>
+#include <variant>
+
+#include <ssoclient/access/endpoint.h>
+#include <ssoclient/negotiation_handler.h>
+#include <ssoclient/token_spec.h>
+
+namespace SsoClient::Access {
+
+class TokenSource;
+
+/// Logs in with a user name and a password.
+struct PasswordLogin {
+  std::string userName{};
+  /// Returns the password, which must not be empty; its text is cleansed from memory after use.
+  /// Called on a worker thread before each login, so that a changed file or vault takes effect at
+  /// once. It may block: callers still end at their deadlines, and its result is then dropped. An
+  /// exception that it throws reaches the callers that wait for the login, and nothing is sent or
+  /// remembered. Must be set.
+  std::function<std::string()> password{};
+};
+
+/// Logs in as the owner of the holder-of-key certificate, which the source must have. The specs
+/// must have `CONFIRMATION_DEFAULT`.
+struct CertificateLogin {};
+
+/// Logs in by a negotiation such as Kerberos.
+struct NegotiatedLogin {
+  /// Returns a new handler, never null. Called on a worker thread for each login at each endpoint;
+  /// may block and throw as `PasswordLogin::password` may. Must be set. With the handler of
+  /// `ssoclient/gssapi_negotiation_handler.h`:
+  ///
+  ///     NegotiatedLogin{[](const Endpoint&) {
+  ///       return SsoClient::CreateGssapiNegotiationHandler({"HTTP@sts.example.com", "", "", ""});
+  ///     }}
+  std::function<std::shared_ptr<NegotiationHandler>(const Endpoint& endpoint)> createHandler{};
+};
+
+/// Exchanges the token of another source, which must be bound to the holder-of-key configuration of
+/// this source. The spec of each call says what for: other audiences, a delegate, or on behalf of
+/// the subject of its act-as token, whose result is never refreshed past the end of that token.
+struct TokenLogin {
+  /// Must not be null, and must not depend on this source.
+  std::shared_ptr<TokenSource> source{};
+  /// What to ask `source` for.
+  TokenSpec spec{};
+};
+
+using Login = std::variant<PasswordLogin, CertificateLogin, NegotiatedLogin, TokenLogin>;
+
+}  // namespace SsoClient::Access
+
+#endif

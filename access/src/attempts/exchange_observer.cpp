@@ -1,0 +1,127 @@
+#include "attempts/exchange_observer.h"
+
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include <tarnik/core/checked_cast.h>
+#include <tarnik/core/object_impl.h>
+#include <tarnik/xml/character_nodes.h>
+#include <tarnik/xml/document.h>
+#include <tarnik/xml/element_node.h>
+#include <tarnik/xml/xml_parser.h>
+
+namespace SsoClient::Access {
+
+namespace {
+
+using Tarnik::Ref;
+using Tarnik::Http::ClientResponse;
+using Tarnik::Http::PendingRequestItem;
+using Tarnik::Xml::ElementNode;
+
+WallTime ReadWallClock() {
+  return std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
+}
+
+const ElementNode* FindFault(const ElementNode& envelope) {
+  const ElementNode* body = envelope.FirstChildElement("Body");
+  return body == nullptr ? nullptr : body->FirstChildElement("Fault");
+}
+
+// The local name of the fault's code; empty without one.
+std::string_view FaultCodeOf(const ElementNode& fault) {
+  const ElementNode* code = fault.FirstChildElement("faultcode");
+  const auto* text = code == nullptr ? nullptr : code->FirstChild();
+  if (text == nullptr || text->Kind() != Tarnik::Xml::NodeKind::kText) {
+    return {};
+  }
+  const std::string_view name = Tarnik::CheckedCast<const Tarnik::Xml::TextNode>(text)->Text();
+  return name.substr(name.find(':') + 1);
+}
+
+UnreadFault Examine(const ElementNode& envelope) {
+  const ElementNode* fault = FindFault(envelope);
+  if (fault == nullptr) {
+    return UnreadFault::kNone;
+  }
+  const std::string_view code = FaultCodeOf(*fault);
+  return code == "FailedAuthentication" || code == "InvalidSecurityToken"
+             ? UnreadFault::kRefusedLogin
+             : UnreadFault::kOther;
+}
+
+UnreadFault Examine(Tarnik::Reader* body) {
+  try {
+    const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
+    const auto document = Tarnik::Xml::CreateXMLParser(body, handler.get())->Parse();
+    return Examine(*Tarnik::CheckedCast<Tarnik::Xml::Document>(document.get())->RootElement());
+  } catch (const Tarnik::Exception&) {
+    return UnreadFault::kNone;  // not an XML document
+  }
+}
+
+class ObservingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::ObjectImpl {
+ public:
+  ObservingUserAgent(Tarnik::Http::UserAgent* inner, Observation& seen)
+      : inner_(inner), seen_(seen) {}
+
+  Ref<PendingRequestItem> SendAsync(Tarnik::Http::ClientRequest* request, Completion completion,
+                                    unsigned long timeoutMicroseconds) override {
+    seen_.hasSent = true;
+    seen_.failure = nullptr;
+    sent_ = ReadWallClock();
+    return inner_->SendAsync(request, std::move(completion), timeoutMicroseconds);
+  }
+
+  Ref<ClientResponse> Wait(PendingRequestItem* item, unsigned long timeoutMicroseconds) override {
+    try {
+      Ref<ClientResponse> response = inner_->Wait(item, timeoutMicroseconds);
+      Note(*response);
+      return response;
+    } catch (const Tarnik::Exception& failure) {
+      seen_.failure = failure.Clone();
+      throw;
+    }
+  }
+
+ private:
+  ~ObservingUserAgent() override = default;
+
+  void Note(const ClientResponse& response) {
+    const WallTime received = ReadWallClock();
+    seen_.httpStatus = response.Status().code;
+    NoteClock(response, received);
+    const auto retryAfter = response.Header("Retry-After");
+    const WallTime serviceNow = seen_.clock ? received + seen_.clock->offset : received;
+    seen_.retryAfter =
+        retryAfter ? ParseRetryAfter(*retryAfter, serviceNow) : std::chrono::milliseconds(0);
+    seen_.unreadFault =
+        IsReadStatus(seen_.httpStatus) ? UnreadFault::kNone : Examine(response.Body().get());
+  }
+
+  void NoteClock(const ClientResponse& response, WallTime received) {
+    const auto header = response.Header("Date");
+    const auto date = header ? ParseHttpDate(*header, received) : std::nullopt;
+    if (date) {
+      seen_.clock = ClockReading{*date, received, EstimateClockOffset(*date, sent_, received)};
+    }
+  }
+
+  const Ref<Tarnik::Http::UserAgent> inner_;
+  Observation& seen_;
+  WallTime sent_;
+};
+
+}  // namespace
+
+bool IsReadStatus(int httpStatus) noexcept {
+  return httpStatus == 500 || (httpStatus >= 200 && httpStatus <= 299);
+}
+
+Tarnik::Ref<Tarnik::Http::UserAgent> CreateObservingUserAgent(Tarnik::Http::UserAgent* inner,
+                                                              Observation& seen) {
+  return Tarnik::MakeRef<ObservingUserAgent>(inner, seen);
+}
+
+}  // namespace SsoClient::Access

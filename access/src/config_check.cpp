@@ -1,0 +1,90 @@
+#include "config_check.h"
+
+#include <string>
+#include <variant>
+
+#include <tarnik/core/exception.h>
+
+namespace SsoClient::Access {
+
+namespace {
+
+constexpr std::chrono::milliseconds kLongestAttempt = std::chrono::seconds(240);
+
+void Require(bool condition, const char* message) {
+  if (!condition) {
+    throw Tarnik::InvalidArgumentException(message);
+  }
+}
+
+struct LoginCheck {
+  const TokenSourceConfig& config;
+
+  void operator()(const PasswordLogin& login) const {
+    Require(login.password != nullptr, "The function for the password is not set.");
+  }
+  void operator()(const CertificateLogin&) const {
+    Require(config.holderOfKey.has_value(),
+            "The login by certificate needs a holder-of-key configuration.");
+  }
+  void operator()(const NegotiatedLogin& login) const {
+    Require(login.createHandler != nullptr, "The function for negotiation handlers is not set.");
+  }
+  void operator()(const TokenLogin& login) const {
+    Require(login.source != nullptr, "The source of the token to exchange is null.");
+    Require(config.holderOfKey.has_value(),
+            "The login by token needs a holder-of-key configuration.");
+    Require(login.spec.tokenLifetimeSec > 0,
+            "The lifetime of the token to exchange is not positive.");
+  }
+};
+
+void CheckRefresh(const RefreshConfig& refresh) {
+  // Written so that a value that is not a number is refused.
+  Require(refresh.fraction > 0 && refresh.fraction < 1,
+          "The fraction of the lifetime after which tokens are refreshed is not between 0 and 1.");
+  Require(refresh.jitter >= 0 && refresh.jitter <= 1,
+          "The jitter of refreshes is not between 0 and 1.");
+  Require(refresh.longestMargin >= std::chrono::seconds(0),
+          "The longest margin of a token is negative.");
+}
+
+void CheckRetry(const RetryConfig& retry) {
+  constexpr std::chrono::milliseconds kNone{0};
+  Require(retry.attempts >= 1, "The number of attempts is not positive.");
+  Require(retry.attemptTimeout > kNone && retry.attemptTimeout <= kLongestAttempt,
+          "The limit of an attempt is not between 1 ms and 240 s.");
+  Require(retry.firstDelay >= kNone && retry.longestDelay >= kNone,
+          "A delay between attempts is negative.");
+  Require(retry.longestRetryAfter >= kNone, "The longest Retry-After is negative.");
+  Require(retry.failuresToOpen >= 1,
+          "The number of failures after which an endpoint is left out is not positive.");
+  Require(retry.refusalMemory >= std::chrono::seconds(0),
+          "The time for which a refused login is remembered is negative.");
+}
+
+}  // namespace
+
+void CheckConfig(const TokenSourceConfig& config) {
+  Require(!config.endpoints.empty(), "There is no endpoint.");
+  Require(config.tokenFactory != nullptr, "The token factory is null.");
+  std::visit(LoginCheck{config}, config.login);
+  CheckRefresh(config.refresh);
+  CheckRetry(config.retry);
+  Require(config.cache.capacity >= 1, "The capacity of the cache is 0.");
+  Require(config.keepFresh.size() <= config.cache.capacity,
+          "More tokens are to be kept fresh than the cache has room for.");
+  for (const TokenSpec& spec : config.keepFresh) {
+    CheckSpec(spec, config.login);
+  }
+}
+
+void CheckSpec(const TokenSpec& spec, const Login& login) {
+  Require(spec.tokenLifetimeSec > 0, "The lifetime of the token is not positive.");
+  Require(!spec.actAsToken || *spec.actAsToken != nullptr, "The act-as token is null.");
+  Require(
+      spec.confirmation == CONFIRMATION_DEFAULT || !std::holds_alternative<CertificateLogin>(login),
+      "A login by certificate cannot request a bearer token.");
+}
+
+}  // namespace SsoClient::Access

@@ -1,0 +1,374 @@
+#include "core.h"
+
+#include <algorithm>
+#include <string>
+#include <utility>
+
+#include <ssoclient/exceptions.h>
+#include <tarnik/system/thread_pool.h>
+
+#include "config_check.h"
+#include "section.h"
+
+namespace SsoClient::Access {
+
+namespace {
+
+constexpr std::chrono::milliseconds kExitLimit{200};
+
+Failure StoppedFailure() {
+  return Failure::Of(Tarnik::InvalidStateException("The token source has been stopped."));
+}
+
+Failure ProcessEndFailure() {
+  return Failure::Of(CommunicationException("The process is ending."));
+}
+
+Failure CancelledFailure() {
+  return Failure::Of(Tarnik::CancelledException("The call was cancelled by its caller."));
+}
+
+Failure TooShortFailure(std::chrono::microseconds granted, std::chrono::seconds minimumLife) {
+  const auto seconds = std::chrono::duration_cast<std::chrono::seconds>(granted);
+  return Failure::Of(SsoException("The service grants " + std::to_string(seconds.count()) +
+                                  " s, but the caller needs a token for " +
+                                  std::to_string(minimumLife.count()) + " s."));
+}
+
+Failure DeadlineFailure(const Request& request) {
+  std::string text = "The deadline passed while the call was waiting for " + request.stage + ".";
+  if (request.lastFailure.IsSet()) {
+    text += " The last attempt had failed: " + request.lastFailure.Message();
+  }
+  return Failure::Of(CommunicationException(text));
+}
+
+Failure LeavingFailure(const Request& request, bool isDeadline) noexcept {
+  try {
+    return isDeadline ? DeadlineFailure(request) : CancelledFailure();
+  } catch (const std::bad_alloc&) {
+    return Failure::OutOfMemory();
+  }
+}
+
+}  // namespace
+
+std::shared_ptr<Core> Core::Create(Parts parts) {
+  auto core = std::make_shared<Core>(std::move(parts));
+  core->KeepFresh();
+  return core;
+}
+
+Core::Core(Parts parts)
+    : config_(std::move(parts.config)),
+      runtime_(std::move(parts.runtime)),
+      activity_(std::make_shared<Activity>()),
+      cache_(config_->cache.capacity),
+      endpoints_(config_->retry, std::move(parts.clients)),
+      gate_(config_->retry.refusalMemory) {}
+
+Core::~Core() = default;
+
+void Core::RequireRunning() const {
+  switch (state_.load(std::memory_order_acquire)) {
+    case State::kRunning:
+      return;
+    case State::kStopped:
+      StoppedFailure().Throw();
+    case State::kProcessEnding:
+      ProcessEndFailure().Throw();
+  }
+}
+
+void Core::CheckContext(const CallContext& context, const Instant& now) const {
+  if (context.cancellation.IsCancelled()) {
+    CancelledFailure().Throw();
+  }
+  if (context.deadline <= now.steady) {
+    throw Tarnik::InvalidArgumentException("The deadline of the call is in the past.");
+  }
+  if (context.minimumLife < std::chrono::seconds(0)) {
+    throw Tarnik::InvalidArgumentException("The minimum life of the token is negative.");
+  }
+}
+
+TokenCache::Hit Core::FindHit(const TokenSpec& spec, const CallContext& context) {
+  RequireRunning();
+  const Instant now = runtime_->Now();
+  CheckContext(context, now);
+  CheckSpec(spec, config_->login);
+  TokenCache::Hit hit = cache_.Find(SpecView(spec), now, context.minimumLife);
+  if (hit.wantsRefresh) {
+    RefreshLate(spec);
+  }
+  return hit;
+}
+
+std::shared_ptr<const SamlToken> Core::GetToken(const TokenSpec& spec, const CallContext& context) {
+  if (TokenCache::Hit hit = FindHit(spec, context); hit.token != nullptr) {
+    return std::move(hit.token);
+  }
+  const auto caller = std::make_shared<BlockedCaller>(context);
+  Wait(spec, caller);
+  Answer answer = caller->Wait();
+  if (answer.failure.IsSet()) {
+    answer.failure.Throw();
+  }
+  return std::move(answer.token);
+}
+
+std::shared_ptr<const SamlToken> Core::TryGetToken(const TokenSpec& spec) {
+  return FindHit(spec, {}).token;
+}
+
+void Core::GetTokenAsync(const TokenSpec& spec, const CallContext& context,
+                         TokenSource::TokenCallback callback) {
+  if (!callback) {
+    throw Tarnik::InvalidArgumentException("The callback is empty.");
+  }
+  const auto caller =
+      std::make_shared<CallbackCaller>(context, std::move(callback), runtime_, activity_);
+  Answer answer;
+  try {
+    answer.token = FindHit(spec, context).token;
+  } catch (const Tarnik::Exception& refusal) {
+    answer.failure = Failure::Copy(refusal);
+  }
+  if (answer.token != nullptr || answer.failure.IsSet()) {
+    caller->ReceiveOrThrow(std::move(answer));
+    return;
+  }
+  Wait(spec, caller);
+}
+
+void Core::RefreshLate(const TokenSpec& spec) noexcept {
+  try {
+    Section section(*this);
+    const EntryPtr entry = cache_.Peek(SpecView(spec));
+    if (state_ == State::kRunning && entry != nullptr) {
+      schedule_.Set(entry->Key(), runtime_->Now().steady);
+      ArmTimer(section);
+    }
+  } catch (...) {
+    // The token is valid, and is refreshed by a later call when it has ended.
+  }
+}
+
+void Core::Wait(const TokenSpec& spec, const WaiterPtr& waiter) {
+  RequestPtr begun;
+  {
+    Section section(*this);
+    begun = Join(section, spec, waiter);
+  }
+  bool isRunning = false;
+  try {
+    if (begun != nullptr) {
+      Run(begun);
+    }
+    isRunning = true;
+    const CancellationToken& token = waiter->Context().cancellation;
+    waiter->cancellation = token.OnCancel([core = weak_from_this(), weak = std::weak_ptr(waiter)] {
+      const auto self = core.lock();
+      const auto left = weak.lock();
+      if (self != nullptr && left != nullptr) {
+        self->Leave(left, Leaving::kCancelled);
+      }
+    });
+  } catch (...) {
+    const bool wasWaiting = Withdraw(waiter);
+    if (begun != nullptr && !isRunning) {
+      FailHere(begun, Failure::Current());  // for those who have joined
+    }
+    if (wasWaiting) {
+      throw;
+    }
+  }
+}
+
+// Returns the request if it is new and must be run.
+RequestPtr Core::Join(Section& section, const TokenSpec& spec, const WaiterPtr& waiter) {
+  if (state_ != State::kRunning) {
+    section.GiveAnswer(
+        waiter, {nullptr, state_ == State::kStopped ? StoppedFailure() : ProcessEndFailure()});
+    return nullptr;
+  }
+  const SpecView view(spec);
+  if (auto answer = AnswerAtOnce(view, waiter, runtime_->Now())) {
+    section.GiveAnswer(waiter, std::move(*answer));
+    return nullptr;
+  }
+  if (waiter->Context().deadline != CallContext::Clock::time_point::max()) {
+    waiter->deadlineTimer = runtime_->RunAt(
+        waiter->Context().deadline, [core = weak_from_this(), weak = std::weak_ptr(waiter)] {
+          const auto self = core.lock();
+          const auto left = weak.lock();
+          if (self != nullptr && left != nullptr) {
+            self->Leave(left, Leaving::kDeadline);
+          }
+        });
+  }
+  const auto found = requests_.find(view);
+  const bool isNew = found == requests_.end();
+  const RequestPtr request =
+      isNew ? std::make_shared<Request>(MakeKey(spec), false, endpoints_.Size()) : found->second;
+  request->waiters.insert(waiter);
+  if (isNew) {
+    requests_.emplace(request->key, request);
+  }
+  waiter->request = request;
+  ++waiting_;
+  (isNew ? counters_.misses : counters_.shared).Add();
+  return isNew ? request : nullptr;
+}
+
+boost::optional<Answer> Core::AnswerAtOnce(const SpecView& spec, const WaiterPtr& waiter,
+                                           const Instant& now) {
+  const std::chrono::seconds minimumLife = waiter->Context().minimumLife;
+  // Another thread may have stored a token since this one has looked.
+  if (TokenCache::Hit hit = cache_.Find(spec, now, minimumLife); hit.token != nullptr) {
+    return Answer{std::move(hit.token), {}};
+  }
+  const EntryPtr entry = cache_.Peek(spec);
+  if (entry != nullptr && !entry->Life().HasEnded(now) && entry->Life().granted < minimumLife) {
+    return Answer{nullptr, TooShortFailure(entry->Life().granted, minimumLife)};
+  }
+  return boost::none;
+}
+
+// True when the waiter was still waiting; it then gets no answer.
+bool Core::Withdraw(const WaiterPtr& waiter) noexcept {
+  Section section(*this);
+  const RequestPtr request = std::exchange(waiter->request, nullptr);
+  if (request == nullptr) {
+    return false;
+  }
+  section.Cancel(waiter->deadlineTimer);
+  request->waiters.erase(waiter);
+  --waiting_;
+  if (request->waiters.empty() && !request->isBackground) {
+    Abandon(section, request, false);
+  }
+  return true;
+}
+
+void Core::Leave(const WaiterPtr& waiter, Leaving why) noexcept {
+  Section section(*this);
+  const RequestPtr request = std::exchange(waiter->request, nullptr);
+  if (request == nullptr) {
+    return;
+  }
+  section.GiveAnswer(waiter, {nullptr, LeavingFailure(*request, why == Leaving::kDeadline)});
+  section.Cancel(waiter->deadlineTimer);
+  request->waiters.erase(waiter);
+  --waiting_;
+  if (request->waiters.empty() && !request->isBackground) {
+    Abandon(section, request, why == Leaving::kDeadline);
+  }
+}
+
+void Core::Abandon(Section& section, const RequestPtr& request, bool hasWaitedInVain) {
+  request->hasWaitedInVain = hasWaitedInVain;
+  Detach(section, request);
+}
+
+void Core::GiveAll(Section& section, const RequestPtr& request, const Failure& failure) {
+  for (const WaiterPtr& waiter : request->waiters) {
+    waiter->request = nullptr;
+    section.Cancel(waiter->deadlineTimer);
+    section.GiveAnswer(waiter, {nullptr, failure});
+  }
+  waiting_ -= request->waiters.size();
+  request->waiters.clear();
+}
+
+void Core::GiveAll(Section& section, const RequestPtr& request, const CacheEntry& entry,
+                   const Instant& now) {
+  for (const WaiterPtr& waiter : request->waiters) {
+    waiter->request = nullptr;
+    section.Cancel(waiter->deadlineTimer);
+    const std::chrono::seconds minimumLife = waiter->Context().minimumLife;
+    if (entry.Life().IsUsable(now, minimumLife)) {
+      section.GiveAnswer(waiter, {entry.Token(), {}});
+    } else {
+      section.GiveAnswer(waiter, {nullptr, TooShortFailure(entry.Life().granted, minimumLife)});
+    }
+  }
+  waiting_ -= request->waiters.size();
+  request->waiters.clear();
+}
+
+void Core::Invalidate(const SamlToken& token) {
+  Section section(*this);
+  EntryPtr refused;
+  cache_.ForEach([&](const EntryPtr& entry) {
+    if (entry->Token().get() == &token ||
+        (entry->Token()->Id() == token.Id() && entry->Token()->Xml() == token.Xml())) {
+      refused = entry;
+    }
+  });
+  if (refused == nullptr) {
+    return;
+  }
+  section.Keep(refused);
+  cache_.Remove(SpecView(*refused->Key()));
+  if (IsPinned(refused->Key())) {
+    schedule_.Set(refused->Key(), runtime_->Now().steady);
+    ArmTimer(section);
+  } else {
+    schedule_.Remove(refused->Key());
+  }
+}
+
+TokenSourceMetrics Core::Metrics() const {
+  TokenSourceMetrics metrics;
+  counters_.CopyTo(metrics);
+  metrics.hits = cache_.Hits();
+  const std::lock_guard lock(mutex_);
+  metrics.keys = cache_.Size();
+  metrics.callersWaiting = waiting_;
+  cache_.ForEach([&metrics](const EntryPtr& entry) {
+    const Tarnik::System::DateTime end = entry->Token()->ExpirationTime();
+    if (!metrics.earliestExpiration || end < *metrics.earliestExpiration) {
+      metrics.earliestExpiration = end;
+    }
+  });
+  return metrics;
+}
+
+bool Core::Stop(std::chrono::milliseconds wait) {
+  EndAll(State::kStopped, StoppedFailure());
+  // The pool runs nothing more then.
+  const bool isPoolStopped = Tarnik::System::IsProcessEnding();
+  return activity_->WaitUntilIdle(isPoolStopped ? std::chrono::milliseconds(0) : wait);
+}
+
+void Core::EndProcess() noexcept {
+  try {
+    EndAll(State::kProcessEnding, ProcessEndFailure());
+    activity_->WaitUntilIdle(kExitLimit);
+  } catch (...) {
+    // No memory: the pool ends what is under way.
+  }
+}
+
+void Core::EndAll(State state, const Failure& failure) {
+  Section section(*this);
+  if (state_ != State::kRunning) {
+    return;
+  }
+  state_.store(state, std::memory_order_release);
+  std::vector<RequestPtr> requests;
+  for (const auto& [key, request] : requests_) {
+    requests.push_back(request);
+  }
+  for (const RequestPtr& request : requests) {
+    GiveAll(section, request, failure);
+    Detach(section, request);
+  }
+  schedule_.Clear();
+  section.Cancel(std::exchange(timer_, nullptr));
+  cache_.ForEach([&section](const EntryPtr& entry) { section.Keep(entry); });
+  cache_.Clear();
+}
+
+}  // namespace SsoClient::Access

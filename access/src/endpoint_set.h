@@ -1,0 +1,84 @@
+#ifndef SSOCLIENT_ACCESS_ENDPOINT_SET_H
+#define SSOCLIENT_ACCESS_ENDPOINT_SET_H
+
+#include <chrono>
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <boost/optional.hpp>
+
+#include "attempt.h"
+#include "circuit.h"
+
+namespace SsoClient::Access {
+
+/// The endpoints of a source, each with its circuit. The preferred one is asked first: the one that
+/// answered last, at first the first. Not thread-safe.
+class EndpointSet {
+ public:
+  using Index = std::size_t;
+  /// Whether a request has asked each endpoint in its current round.
+  using Asked = std::vector<bool>;
+  /// The new state of a circuit; not set when it has not changed.
+  using Change = boost::optional<CircuitRecord>;
+
+  EndpointSet(const RetryConfig& config, std::vector<std::unique_ptr<EndpointClient>> clients);
+
+  std::size_t Size() const noexcept { return members_.size(); }
+  EndpointClient& Client(Index index) const { return *members_[index].client; }
+  const std::string& Url(Index index) const { return Client(index).Where().url; }
+
+  /// True when an endpoint that is not in `asked` may be asked.
+  bool CanAdmit(const Asked& asked, Instant::Steady now) const;
+  bool CanAdmit(Index index, Instant::Steady now) const {
+    return members_[index].circuit.CanAdmit(now);
+  }
+  struct Admission {
+    boost::optional<Index> endpoint;  ///< not set when none may be asked
+    Change change;
+  };
+  /// The next endpoint that is not in `asked`. Its outcome must be reported.
+  Admission Admit(const Asked& asked, Instant::Steady now);
+
+  /// The endpoint has answered, and is preferred now. `change` closes the circuit.
+  Change OnAnswer(Index index);
+  Change OnFailure(Index index, const std::string& reason, std::chrono::milliseconds retryAfter,
+                   Instant::Steady now, double draw);
+  /// The attempt ended before the endpoint did anything. If the callers' deadlines had passed
+  /// before, another endpoint is preferred.
+  Change OnAbandoned(Index index, bool hasWaitedInVain);
+
+  /// When an endpoint with a closed circuit may be asked; not set when all circuits are open.
+  boost::optional<Instant::Steady> ClosedAdmission() const;
+  /// When any endpoint may be asked.
+  Instant::Steady EarliestAdmission() const;
+  /// Why an endpoint is left out, with its last failure.
+  std::string WhyLeftOut(Index index, Instant::Steady now) const;
+
+  /// The offset of the endpoint's clock that was seen last; zero before.
+  std::chrono::milliseconds ClockOffset(Index index) const { return members_[index].clockOffset; }
+  /// Notes an offset; true when the clock began or ceased to be wrong.
+  bool SetClockOffset(Index index, std::chrono::milliseconds offset);
+
+ private:
+  struct Member {
+    std::unique_ptr<EndpointClient> client;
+    Circuit circuit;
+    std::string lastReason;
+    std::chrono::milliseconds clockOffset{0};
+    bool isClockWrong = false;
+  };
+
+  // The endpoints in the order in which they are asked.
+  Index Nth(std::size_t n) const;
+  Change ChangeSince(CircuitState before, Index index, Instant::Steady now) const;
+
+  std::vector<Member> members_;
+  Index preferred_ = 0;
+};
+
+}  // namespace SsoClient::Access
+
+#endif

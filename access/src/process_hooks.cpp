@@ -1,0 +1,83 @@
+#include "process_hooks.h"
+
+#include <atomic>
+#include <cstdlib>
+#include <mutex>
+#include <utility>
+#include <vector>
+
+#include <pthread.h>
+
+#include "core.h"
+
+namespace SsoClient::Access {
+
+namespace {
+
+// Never destroyed, and replaced in a forked child, where its lock may be held by nobody.
+struct Registry {
+  std::mutex mutex;
+  std::vector<std::weak_ptr<Core>> cores;
+};
+
+std::atomic<std::uint64_t> generation{0};
+std::atomic<Registry*> registry{nullptr};
+std::atomic<bool> isEndWatched{false};
+
+// Only what a signal handler may do as well.
+void BeginChild() noexcept {
+  generation.fetch_add(1, std::memory_order_relaxed);
+  registry.store(nullptr, std::memory_order_relaxed);
+}
+
+[[maybe_unused]] const bool kTakesPartInFork = pthread_atfork(nullptr, nullptr, &BeginChild) == 0;
+
+Registry& OwnRegistry() {
+  Registry* current = registry.load(std::memory_order_acquire);
+  if (current == nullptr) {
+    auto created = std::make_unique<Registry>();
+    if (registry.compare_exchange_strong(current, created.get(), std::memory_order_acq_rel)) {
+      current = created.release();
+    }
+  }
+  return *current;
+}
+
+}  // namespace
+
+std::uint64_t ForkGeneration() noexcept {
+  return generation.load(std::memory_order_relaxed);
+}
+
+void RegisterCore(const std::shared_ptr<Core>& core) {
+  Registry& own = OwnRegistry();
+  const std::lock_guard lock(own.mutex);
+  std::erase_if(own.cores, [](const auto& other) { return other.expired(); });
+  own.cores.push_back(core);
+}
+
+void WatchProcessEnd() noexcept {
+  if (!isEndWatched.load(std::memory_order_relaxed) && !isEndWatched.exchange(true)) {
+    // Without memory for the handler, waiting calls end with the process.
+    static_cast<void>(std::atexit([] { EndCoresOfProcess(); }));
+  }
+}
+
+void EndCoresOfProcess() noexcept {
+  Registry* const own = registry.load(std::memory_order_acquire);
+  if (own == nullptr) {
+    return;
+  }
+  std::vector<std::weak_ptr<Core>> cores;
+  {
+    const std::lock_guard lock(own->mutex);
+    cores.swap(own->cores);
+  }
+  for (const auto& weak : cores) {
+    if (const auto core = weak.lock()) {
+      core->EndProcess();
+    }
+  }
+}
+
+}  // namespace SsoClient::Access

@@ -1,0 +1,190 @@
+#include <algorithm>
+#include <memory>
+#include <utility>
+
+#include "backoff.h"
+#include "core.h"
+#include "section.h"
+
+namespace SsoClient::Access {
+
+namespace {
+
+using std::chrono::milliseconds;
+
+// Refreshes must not take the threads that callers need.
+constexpr std::size_t kMaxBackgroundRequests = 8;
+constexpr std::chrono::seconds kNextLook{1};
+
+// When the act-as token of a spec ends, nothing may be requested with it any more.
+bool HasActAsEnded(const TokenSpec& spec, const Instant& now) {
+  const auto wall =
+      std::chrono::duration_cast<std::chrono::microseconds>(now.wall.time_since_epoch());
+  return spec.actAsToken && (*spec.actAsToken)->ExpirationTime().GetUtcTime() <= wall.count();
+}
+
+Tarnik::System::DateTime ToDateTime(Instant::Wall time) {
+  const auto sinceEpoch =
+      std::chrono::duration_cast<std::chrono::microseconds>(time.time_since_epoch());
+  return Tarnik::System::DateTimeFromUtc(sinceEpoch.count(), false);
+}
+
+}  // namespace
+
+void Core::KeepFresh() {
+  Section section(*this);
+  const Instant now = runtime_->Now();
+  for (const TokenSpec& spec : config_->keepFresh) {
+    schedule_.Set(MakeKey(spec), now.steady).isPinned = true;
+  }
+  ArmTimer(section);
+}
+
+// The timer has fired.
+void Core::RunDue() noexcept {
+  try {
+    Section section(*this);
+    timer_ = nullptr;
+    timerAt_ = Instant::Steady::max();
+    if (state_ != State::kRunning) {
+      return;
+    }
+    const Instant now = runtime_->Now();
+    for (const KeyPtr& key : schedule_.Due(now.steady, config_->cache.capacity * 2)) {
+      if (backgroundRequests_ == kMaxBackgroundRequests) {
+        break;
+      }
+      LookAt(section, key, now);
+    }
+    ArmTimer(section);
+  } catch (...) {
+    // No memory. The next call that stores a token arms the timer again.
+  }
+}
+
+void Core::LookAt(Section& section, const KeyPtr& key, const Instant& now) {
+  const bool isPinned = IsPinned(key);
+  EntryPtr entry = cache_.Peek(SpecView(*key));
+  if (entry != nullptr && entry->Life().HasEnded(now)) {
+    cache_.Remove(SpecView(*key));
+    section.Keep(std::exchange(entry, nullptr));
+  }
+  const bool hasActAsEnded = HasActAsEnded(key->spec, now);
+  if (entry == nullptr && (!isPinned || hasActAsEnded)) {
+    schedule_.Remove(key);
+    return;
+  }
+  if (requests_.find(key) != requests_.end()) {
+    schedule_.Set(key, now.steady + kNextLook);
+    return;
+  }
+  if (hasActAsEnded || (!isPinned && !entry->IsAsked())) {
+    schedule_.Set(key, entry->Life().end.steady);
+    return;
+  }
+  // The end of the request sets another time.
+  schedule_.Set(key, entry != nullptr ? std::max(entry->Life().end.steady, now.steady + kNextLook)
+                                      : now.steady + config_->retry.longestDelay + kNextLook);
+  RefreshInBackground(section, key);
+}
+
+void Core::RefreshInBackground(Section& section, const KeyPtr& key) {
+  const auto request = std::make_shared<Request>(key, true, endpoints_.Size());
+  section.Start(request);
+  requests_.emplace(key, request);
+  ++backgroundRequests_;
+}
+
+EntryPtr Core::Store(Section& section, const KeyPtr& key,
+                     const std::shared_ptr<const SamlToken>& token, const TokenLife& life,
+                     const Instant& now) {
+  section.Keep(cache_.Peek(SpecView(*key)));
+  auto entry = std::make_shared<CacheEntry>(key, token, life, now);
+  const EntryPtr evicted =
+      cache_.Insert(entry, [this](const KeyPtr& other) { return IsPinned(other); });
+  if (evicted != nullptr) {
+    section.Keep(evicted);
+    counters_.evictions.Add();
+    schedule_.Remove(evicted->Key());
+  }
+  RefreshSchedule::Item& item = schedule_.Set(key, life.refreshAt);
+  item.failures = 0;
+  item.isOutage = false;
+  ArmTimer(section);
+  return entry;
+}
+
+void Core::ScheduleAfterFailure(Section& section, const Request& request, const Failure& failure,
+                                FailureKind kind, const Instant& now) {
+  RefreshSchedule::Item* item = schedule_.Find(request.key);
+  if (item == nullptr || !request.isBackground) {
+    return;
+  }
+  counters_.refreshFailures.Add();
+  ++item->failures;
+  item->isOutage = AllowsFailover(kind);
+  Instant::Steady next =
+      now.steady + Backoff(config_->retry, item->failures, milliseconds(0), runtime_->Draw());
+  if (item->isOutage) {
+    next = std::max(next, endpoints_.EarliestAdmission());
+  }
+  RefreshFailureRecord record;
+  const EntryPtr entry = cache_.Peek(SpecView(*request.key));
+  if (entry != nullptr) {
+    next = std::min(next, std::max(entry->Life().end.steady, now.steady));
+    record.usableUntil = ToDateTime(entry->Life().usableUntil.wall);
+  }
+  schedule_.Set(request.key, next);
+  ArmTimer(section);
+  record.source = config_->name;
+  record.failure = kind;
+  record.message = failure.Message();
+  record.nextAttempt = std::chrono::ceil<milliseconds>(next - now.steady);
+  section.ToListener([record](AccessListener& listener) { listener.OnRefreshFailed(record); });
+}
+
+// An endpoint answers again. What waits for that goes on, spread a little.
+void Core::EndOutage(Section& section, const Instant& now) {
+  for (const auto& [key, request] : requests_) {
+    if (request->pause != nullptr) {
+      section.Cancel(std::exchange(request->pause, nullptr));
+      section.Start(request);
+    }
+  }
+  for (const KeyPtr& key : schedule_.EndOutage()) {
+    const auto spread = std::chrono::duration_cast<milliseconds>(
+        runtime_->Draw() * std::chrono::duration<double, std::milli>(config_->retry.firstDelay));
+    const RefreshSchedule::Item* item = schedule_.Find(key);
+    schedule_.Set(key, std::min(item->at, now.steady + spread));
+  }
+  ArmTimer(section);
+}
+
+void Core::ArmTimer(Section& section) {
+  const auto earliest = schedule_.Earliest();
+  // The end of a background request arms the timer.
+  if (!earliest || state_ != State::kRunning || backgroundRequests_ >= kMaxBackgroundRequests) {
+    return;
+  }
+  if (timer_ != nullptr && timerAt_ <= *earliest) {
+    return;
+  }
+  section.Cancel(std::exchange(timer_, nullptr));
+  timerAt_ = *earliest;
+  try {
+    timer_ = runtime_->RunAt(timerAt_, [core = weak_from_this()] {
+      if (const auto self = core.lock()) {
+        self->RunDue();
+      }
+    });
+  } catch (...) {
+    // No timer now. The next change of the schedule tries again.
+  }
+}
+
+bool Core::IsPinned(const KeyPtr& key) {
+  const RefreshSchedule::Item* item = schedule_.Find(key);
+  return item != nullptr && item->isPinned;
+}
+
+}  // namespace SsoClient::Access

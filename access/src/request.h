@@ -1,0 +1,64 @@
+#ifndef SSOCLIENT_ACCESS_REQUEST_H
+#define SSOCLIENT_ACCESS_REQUEST_H
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <unordered_set>
+#include <vector>
+
+#include <ssoclient/access/call_context.h>
+#include <tarnik/http/bounded_user_agent.h>
+
+#include "cache_key.h"
+#include "endpoint_set.h"
+#include "failure.h"
+#include "login_gate.h"
+#include "waiter.h"
+
+namespace SsoClient::Access {
+
+/// The only request for the token of a key, and those who wait for it. Under the lock of the core.
+struct Request {
+  explicit Request(KeyPtr k, bool isInBackground, std::size_t endpoints)
+      : key(std::move(k)), isBackground(isInBackground), asked(endpoints), reasons(endpoints) {}
+
+  const KeyPtr key;
+  /// Goes on although nobody waits.
+  const bool isBackground;
+  std::unordered_set<WaiterPtr> waiters;
+  /// What it is doing, for the message of a deadline: "... was waiting for" this.
+  std::string stage = "a worker thread";
+  /// It has ended, or nobody waits for it: the thread that works for it drops what it has.
+  bool hasEnded = false;
+  /// The callers that waited for it have left at their deadlines.
+  bool hasWaitedInVain = false;
+
+  bool mayRenew = true;
+  /// The tag of the secret whose gate it has or waits for.
+  std::optional<LoginGate::Tag> gate;
+  /// The token to exchange for `TokenLogin`, and whether the first one has been refused.
+  std::shared_ptr<const SamlToken> base;
+  bool hasReplacedBase = false;
+  /// Ends the request for `base`.
+  CancellationSource cancellation;
+
+  int attempts = 0;
+  int undecided = 0;  ///< attempts that no service has decided
+  int rounds = 1;
+  EndpointSet::Asked asked;
+  std::vector<std::string> reasons;  ///< the last failure of each endpoint in this request
+  Failure lastFailure;
+  FailureKind lastKind = FailureKind::kNone;
+  /// The limit of the attempt under way; null between attempts.
+  Tarnik::Ref<Tarnik::Http::CallLimit> limit;
+  /// The pause before the next round; null otherwise.
+  Tarnik::Ref<Tarnik::System::CancellableItem> pause;
+  std::chrono::milliseconds retryAfter{0};
+  /// The next one in the list of a section that is about to run this one.
+  std::shared_ptr<Request> nextStarted;
+};
+
+}  // namespace SsoClient::Access
+
+#endif

@@ -1,0 +1,29 @@
+#ifndef SSOCLIENT_ACCESS_STEP_H
+#define SSOCLIENT_ACCESS_STEP_H
+
+#include <memory>
+
+#include <ssoclient/access/listener.h>
+#include <tarnik/http/bounded_user_agent.h>
+
+#include "endpoint_set.h"
+#include "instant.h"
+#include "secret.h"
+
+namespace SsoClient::Access {
+
+/// One attempt of a request, in preparation and under way.
+struct Step {
+  AttemptOperation operation = AttemptOperation::kLogin;
+  /// The token to renew or to exchange.
+  std::shared_ptr<const SamlToken> base;
+  SecretTagger::Tag tag = 0;  ///< of the password; zero for other logins
+  EndpointSet::Index endpoint = 0;
+  Tarnik::Ref<Tarnik::Http::CallLimit> limit;
+  AttemptRecord record;
+  Instant::Steady begun;
+};
+
+}  // namespace SsoClient::Access
+
+#endif

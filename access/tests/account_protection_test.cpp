@@ -1,0 +1,231 @@
+#include <utility>
+
+#include <gtest/gtest.h>
+
+#include <ssoclient/exceptions.h>
+
+#include "support/source_fixture.h"
+
+namespace SsoClient::Access::Testing {
+
+namespace {
+
+using Limit = Tarnik::Http::CallLimit;
+
+std::string AudienceNumber(int number) {
+  return "https://service" + std::to_string(number) + ".example.com";
+}
+
+class AccountProtectionTest : public SourceFixture {
+ protected:
+  // A service that knows one password.
+  void Know(const std::string& known, const AttemptOutcome& refusal) {
+    ForAll([this, known, refusal](const AttemptRequest& request, Limit&) {
+      return request.secret == known ? Issued(NewToken(hours(1))) : refusal;
+    });
+  }
+};
+
+TEST_F(AccountProtectionTest, WrongPasswordIsSentOnceWhateverTheNumberOfCallersAndKeys) {
+  Know("right", Refused());
+  Make();
+  std::vector<std::shared_ptr<Reply>> replies;
+  for (int i = 0; i < 1000; ++i) {
+    replies.push_back(Ask(SpecFor(AudienceNumber(i % 100))));
+  }
+  runtime->Settle();
+  for (int i = 0; i < 1000; ++i) {
+    replies.push_back(Ask(SpecFor(AudienceNumber(i % 200))));
+    runtime->Advance(milliseconds(100));
+  }
+  EXPECT_EQ(Attempts(), 1U);
+  for (const auto& reply : replies) {
+    ASSERT_TRUE(reply->Has());
+    ASSERT_TRUE(reply->Is<InvalidCredentialsException>());
+    ASSERT_EQ(reply->Message(), "Wrong password.");
+  }
+  EXPECT_EQ(source->Metrics().refusedFromMemory, 1990U);
+}
+
+TEST_F(AccountProtectionTest, ExpiredPasswordIsSentOnce) {
+  Know("right", Expired());
+  Make();
+  for (int i = 0; i < 20; ++i) {
+    EXPECT_TRUE(Get(SpecFor(AudienceNumber(i))).Is<PasswordExpiredException>());
+  }
+  EXPECT_EQ(Attempts(), 1U);
+}
+
+TEST_F(AccountProtectionTest, RefusalIsForgottenAfterTheStatedTime) {
+  Know("right", Refused());
+  Make();
+  Get(spec);
+  runtime->Advance(minutes(5) - milliseconds(1));
+  EXPECT_TRUE(Get(spec).Is<InvalidCredentialsException>());
+  EXPECT_EQ(Attempts(), 1U);
+  runtime->Advance(milliseconds(1));
+  EXPECT_TRUE(Get(spec).Is<InvalidCredentialsException>());
+  EXPECT_EQ(Attempts(), 2U);
+}
+
+TEST_F(AccountProtectionTest, ChangedSecretIsUsedAtOnce) {
+  Know("right", Refused());
+  Make();
+  EXPECT_TRUE(Get(spec).Is<InvalidCredentialsException>());
+  password = "right";
+  EXPECT_NE(Get(spec).token, nullptr);
+  EXPECT_EQ(Attempts(), 2U);
+  // The old one is still known.
+  password = "secret";
+  EXPECT_TRUE(Get(SpecFor("https://other.example.com")).Is<InvalidCredentialsException>());
+  EXPECT_EQ(Attempts(), 2U);
+}
+
+TEST_F(AccountProtectionTest, OnlyOneLoginIsUnderWayUntilOneHasSucceeded) {
+  Make();
+  std::size_t whileFirst = 0;
+  bool isFirst = true;
+  ForAll([&](const AttemptRequest&, Limit&) {
+    if (std::exchange(isFirst, false)) {
+      runtime->Settle();
+      whileFirst = Attempts();
+    }
+    return Issued(NewToken(hours(1)));
+  });
+  std::vector<std::shared_ptr<Reply>> replies;
+  for (int i = 0; i < 50; ++i) {
+    replies.push_back(Ask(SpecFor(AudienceNumber(i))));
+  }
+  runtime->Settle();
+  EXPECT_EQ(whileFirst, 1U);
+  EXPECT_EQ(Attempts(), 50U);
+  for (const auto& reply : replies) {
+    EXPECT_NE(reply->token, nullptr);
+  }
+}
+
+TEST_F(AccountProtectionTest, PasswordThatIsChangedAtTheServiceIsRefusedOnce) {
+  Know("secret", Refused());
+  config.refresh.jitter = 0;
+  Make();
+  for (int i = 0; i < 20; ++i) {
+    ASSERT_NE(Get(SpecFor(AudienceNumber(i))).token, nullptr);
+    ASSERT_NE(source->TryGetToken(SpecFor(AudienceNumber(i))), nullptr);
+  }
+  const std::size_t before = Attempts();
+  Know("changed", Refused());
+  runtime->Advance(minutes(46));
+  EXPECT_EQ(Attempts(), before + 1);
+  EXPECT_GE(source->Metrics().refreshFailures, 20U);
+  // The tokens are served, and the new password is found without a call.
+  EXPECT_NE(source->TryGetToken(spec), source->TryGetToken(SpecFor(AudienceNumber(1))));
+  password = "changed";
+  runtime->Advance(minutes(5));
+  EXPECT_EQ(Attempts(), before + 21);
+}
+
+TEST_F(AccountProtectionTest, WaitingForTheLoginOfAnotherCallEndsAtTheDeadline) {
+  Make();
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    runtime->Settle();
+    runtime->Pass(seconds(3));
+    return Issued(NewToken(hours(1)));
+  });
+  const auto first = Ask(spec);
+  const auto second = Ask(SpecFor("https://other.example.com"), Within(seconds(1)));
+  const auto third = Ask(SpecFor("https://third.example.com"));
+  runtime->Settle();
+  EXPECT_NE(first->token, nullptr);
+  EXPECT_EQ(second->Message(),
+            "The deadline passed while the call was waiting for the login of another call.");
+  EXPECT_NE(third->token, nullptr);
+}
+
+TEST_F(AccountProtectionTest, GatePassesOnWhenTheOneWhoseTurnItIsLeavesInTheLoginsFunction) {
+  // The function blocks for the second request, whose turn has come, until it has been abandoned.
+  int calls = 0;
+  config.login = PasswordLogin{"alice", [&] {
+                                 if (++calls == 4) {
+                                   runtime->Pass(seconds(10));
+                                 }
+                                 return password;
+                               }};
+  config.endpoints.resize(1);
+  Make();
+  bool isFirst = true;
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    if (std::exchange(isFirst, false)) {
+      runtime->Settle();
+      return Fault();
+    }
+    return Issued(NewToken(hours(1)));
+  });
+  const auto first = Ask(spec);
+  const auto second = Ask(SpecFor("https://second.example.com"), Within(seconds(5)));
+  const auto third = Ask(SpecFor("https://third.example.com"));
+  runtime->Settle();
+  EXPECT_TRUE(first->Is<SsoException>());
+  EXPECT_TRUE(second->Is<CommunicationException>());
+  EXPECT_NE(third->token, nullptr);
+}
+
+TEST_F(AccountProtectionTest, GatePassesOnWhenTheSecretHasChanged) {
+  int calls = 0;
+  config.login = PasswordLogin{"alice", [&] {
+                                 // The second request logs in with another one when it has its
+                                 // turn.
+                                 return std::string(++calls == 4 ? "two" : "one");
+                               }};
+  config.endpoints.resize(1);
+  Make();
+  bool isFirst = true;
+  std::shared_ptr<Reply> third;
+  bool hadTurn = false;
+  scripts[0]->Set([&](const AttemptRequest& request, Limit&) {
+    if (std::exchange(isFirst, false)) {
+      runtime->Settle();
+      return Fault();
+    }
+    if (request.secret == "two") {
+      runtime->Settle();
+      hadTurn = third->Has();
+      return Fault();
+    }
+    return Issued(NewToken(hours(1)));
+  });
+  const auto first = Ask(spec);
+  const auto second = Ask(SpecFor("https://second.example.com"));
+  third = Ask(SpecFor("https://third.example.com"));
+  runtime->Settle();
+  EXPECT_TRUE(hadTurn);
+  EXPECT_TRUE(first->Is<SsoException>());
+  EXPECT_TRUE(second->Is<SsoException>());
+  EXPECT_NE(third->token, nullptr);
+}
+
+TEST_F(AccountProtectionTest, AbandonedLoginKeepsTheGateUntilItHasEnded) {
+  Make();
+  std::size_t during = 0;
+  bool isFirst = true;
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    if (std::exchange(isFirst, false)) {
+      runtime->Pass(seconds(2));
+      Ask(spec);
+      Ask(SpecFor("https://other.example.com"));
+      runtime->Settle();
+      during = Attempts();
+      return Refused();
+    }
+    return Issued(NewToken(hours(1)));
+  });
+  const auto first = Ask(spec, Within(seconds(1)));
+  runtime->Settle();
+  EXPECT_EQ(during, 1U);
+  EXPECT_EQ(Attempts(), 1U);
+  EXPECT_TRUE(first->Is<CommunicationException>());
+  EXPECT_TRUE(Get(spec).Is<InvalidCredentialsException>());
+}
+
+}  // namespace
+
+}  // namespace SsoClient::Access::Testing

@@ -1,0 +1,122 @@
+#include <atomic>
+#include <future>
+#include <thread>
+
+#include <gtest/gtest.h>
+
+#include <ssoclient/exceptions.h>
+
+#include "core.h"
+#include "support/source_fixture.h"
+
+namespace SsoClient::Access::Testing {
+
+namespace {
+
+using Limit = Tarnik::Http::CallLimit;
+
+class CoreEndTest : public SourceFixture {};
+
+TEST_F(CoreEndTest, StopEndsCallersAndLaterCalls) {
+  Make();
+  const Reply cached = Get(spec);
+  ForAll(Fails(Unreachable()));
+  const auto waiting = Ask(SpecFor("https://stock.example.com"));
+  runtime->Settle();
+  ASSERT_FALSE(waiting->Has());
+  const auto stopped = std::async(std::launch::async, [this] { return source->Stop(seconds(60)); });
+  // The callback that `Stop` waits for is work of this thread.
+  runtime->RunUntil([&] { return waiting->Has(); });
+  EXPECT_TRUE(waiting->Is<Tarnik::InvalidStateException>());
+  stopped.wait();
+  EXPECT_THROW(source->GetToken(spec, {}), Tarnik::InvalidStateException);
+  EXPECT_THROW(source->TryGetToken(spec), Tarnik::InvalidStateException);
+  EXPECT_TRUE(Get(spec).Is<Tarnik::InvalidStateException>());
+  EXPECT_TRUE(source->Stop(milliseconds(0)));
+  const std::size_t attempts = Attempts();
+  runtime->Advance(hours(2));
+  EXPECT_EQ(Attempts(), attempts);
+  EXPECT_EQ(runtime->TimersArmed(), 0U);
+}
+
+TEST_F(CoreEndTest, StopCancelsTheExchange) {
+  Make();
+  bool isCancelled = false;
+  scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
+    source->Stop(milliseconds(0));
+    isCancelled = limit.IsCancelled();
+    return Issued(NewToken(hours(1)));
+  });
+  const Reply reply = Get(spec);
+  EXPECT_TRUE(isCancelled);
+  EXPECT_EQ(reply.calls, 1);
+  EXPECT_TRUE(reply.Is<Tarnik::InvalidStateException>());
+}
+
+TEST_F(CoreEndTest, StopInACallbackDoesNotWaitForItself) {
+  Make();
+  bool wasIdle = false;
+  source->GetTokenAsync(
+      spec, {}, [&](const auto&, const Tarnik::Exception*) { wasIdle = source->Stop(hours(1)); });
+  runtime->Settle();
+  EXPECT_TRUE(wasIdle);
+}
+
+TEST_F(CoreEndTest, LastReferenceMayBeReleasedInACallback) {
+  Make();
+  int calls = 0;
+  auto* const raw = source.get();
+  auto last = std::make_shared<std::shared_ptr<TokenSourceImpl>>(std::move(source));
+  raw->GetTokenAsync(spec, {}, [last, &calls](const auto&, const Tarnik::Exception*) {
+    last->reset();
+    ++calls;
+  });
+  runtime->Settle();
+  EXPECT_EQ(calls, 1);
+}
+
+TEST_F(CoreEndTest, StopReportsThatAFunctionIsStillRunning) {
+  bool wasIdle = true;
+  config.login =
+      PasswordLogin{"alice", [&] {
+                      std::thread other([&] { wasIdle = source->Stop(milliseconds(1)); });
+                      other.join();
+                      return password;
+                    }};
+  Make();
+  const Reply reply = Get(spec);
+  EXPECT_FALSE(wasIdle);
+  EXPECT_TRUE(reply.Is<Tarnik::InvalidStateException>());
+  EXPECT_EQ(Attempts(), 0U);
+}
+
+TEST_F(CoreEndTest, ProcessEndEndsCallers) {
+  const auto shared = std::make_shared<const TokenSourceConfig>(config);
+  Core::Parts parts{shared, runtime, {}};
+  for (const Endpoint& endpoint : config.endpoints) {
+    parts.clients.push_back(std::make_unique<ScriptedEndpoint>(endpoint, scripts[0]));
+  }
+  const auto core = Core::Create(std::move(parts));
+  std::thread ending;
+  scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
+    ending = std::thread([&core] { core->EndProcess(); });
+    while (!limit.IsCancelled()) {
+      std::this_thread::yield();
+    }
+    return Issued(NewToken(hours(1)));
+  });
+  int calls = 0;
+  std::string message;
+  core->GetTokenAsync(spec, {}, [&](const auto&, const Tarnik::Exception* failure) {
+    ++calls;
+    message = dynamic_cast<const CommunicationException&>(*failure).Message();
+  });
+  runtime->RunUntil([&] { return calls == 1; });
+  ending.join();
+  EXPECT_EQ(message, "The process is ending.");
+  EXPECT_THROW(core->GetToken(spec, {}), CommunicationException);
+}
+
+}  // namespace
+
+}  // namespace SsoClient::Access::Testing

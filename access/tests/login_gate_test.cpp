@@ -1,0 +1,131 @@
+#include "login_gate.h"
+
+#include <gtest/gtest.h>
+
+#include <ssoclient/exceptions.h>
+
+#include "request.h"
+
+namespace SsoClient::Access {
+
+namespace {
+
+using std::chrono::minutes;
+using std::chrono::seconds;
+
+using Turns = std::vector<RequestPtr>;
+
+RequestPtr MakeRequest() {
+  return std::make_shared<Request>(MakeKey(TokenSpec()), false, 1);
+}
+
+class LoginGateTest : public ::testing::Test {
+ protected:
+  Turns Leave(const RequestPtr& request, LoginVerdict verdict) {
+    return gate.Leave(1, request, verdict, verdict == LoginVerdict::kRefused ? refusal : Failure(),
+                      now);
+  }
+
+  LoginGate gate{minutes(5)};
+  Instant::Steady now{std::chrono::hours(1)};
+  const RequestPtr a = MakeRequest();
+  const RequestPtr b = MakeRequest();
+  const RequestPtr c = MakeRequest();
+  const Failure refusal = Failure::Of(InvalidCredentialsException("Wrong."));
+};
+
+TEST_F(LoginGateTest, OneEntersAndTheOthersQueue) {
+  EXPECT_TRUE(gate.Enter(1, a, now));
+  EXPECT_FALSE(gate.Enter(1, b, now));
+  EXPECT_FALSE(gate.Enter(1, c, now));
+  EXPECT_TRUE(gate.Enter(1, a, now));
+}
+
+TEST_F(LoginGateTest, SecretsDoNotWaitForEachOther) {
+  EXPECT_TRUE(gate.Enter(1, a, now));
+  EXPECT_TRUE(gate.Enter(2, b, now));
+}
+
+TEST_F(LoginGateTest, AcceptedLoginReleasesAll) {
+  gate.Enter(1, a, now);
+  gate.Enter(1, b, now);
+  gate.Enter(1, c, now);
+  EXPECT_EQ(Leave(a, LoginVerdict::kAccepted), (Turns{b, c}));
+  EXPECT_TRUE(gate.Enter(1, b, now));
+  EXPECT_TRUE(gate.Enter(1, c, now));
+}
+
+TEST_F(LoginGateTest, AcceptedSecretIsTriedAgainByOneAfterSomeSeconds) {
+  gate.Enter(1, a, now);
+  Leave(a, LoginVerdict::kAccepted);
+  now += seconds(9);
+  EXPECT_TRUE(gate.Enter(1, a, now));
+  EXPECT_TRUE(gate.Enter(1, b, now));
+  now += seconds(1);
+  EXPECT_TRUE(gate.Enter(1, b, now));
+  EXPECT_FALSE(gate.Enter(1, c, now));
+}
+
+TEST_F(LoginGateTest, RefusalIsRememberedAndReleasesAll) {
+  gate.Enter(1, a, now);
+  gate.Enter(1, b, now);
+  EXPECT_FALSE(gate.RefusalOf(1, now).IsSet());
+  EXPECT_EQ(Leave(a, LoginVerdict::kRefused), Turns{b});
+  EXPECT_THROW(gate.RefusalOf(1, now).Throw(), InvalidCredentialsException);
+  EXPECT_FALSE(gate.RefusalOf(2, now).IsSet());
+  now += minutes(5);
+  EXPECT_FALSE(gate.RefusalOf(1, now).IsSet());
+}
+
+TEST_F(LoginGateTest, SuccessEndsTheMemory) {
+  gate.Enter(1, a, now);
+  Leave(a, LoginVerdict::kRefused);
+  Leave(b, LoginVerdict::kAccepted);
+  EXPECT_FALSE(gate.RefusalOf(1, now).IsSet());
+}
+
+TEST_F(LoginGateTest, RefusalClosesTheGateOfASecretThatWasAccepted) {
+  gate.Enter(1, a, now);
+  Leave(a, LoginVerdict::kAccepted);
+  Leave(b, LoginVerdict::kRefused);
+  now += minutes(5);
+  EXPECT_TRUE(gate.Enter(1, b, now));
+  EXPECT_FALSE(gate.Enter(1, c, now));
+}
+
+TEST_F(LoginGateTest, UndecidedLoginGivesTheGateToTheNext) {
+  gate.Enter(1, a, now);
+  gate.Enter(1, b, now);
+  gate.Enter(1, c, now);
+  EXPECT_EQ(Leave(a, LoginVerdict::kUndecided), Turns{b});
+  // The gate is kept for the one whose turn it is.
+  EXPECT_FALSE(gate.Enter(1, a, now));
+  EXPECT_TRUE(gate.Enter(1, b, now));
+  EXPECT_EQ(Leave(b, LoginVerdict::kUndecided), Turns{c});
+  EXPECT_EQ(Leave(c, LoginVerdict::kUndecided), Turns{a});
+  EXPECT_EQ(Leave(a, LoginVerdict::kUndecided), Turns{});
+}
+
+TEST_F(LoginGateTest, WithdrawnRequestGetsNoTurn) {
+  gate.Enter(1, a, now);
+  gate.Enter(1, b, now);
+  gate.Enter(1, c, now);
+  EXPECT_EQ(gate.Withdraw(b), Turns{});
+  EXPECT_EQ(gate.Withdraw(a), Turns{c});
+  EXPECT_EQ(gate.Withdraw(a), Turns{});
+}
+
+TEST_F(LoginGateTest, RequestsThatAreGoneAreNotKept) {
+  const std::weak_ptr<Request> weak = [this] {
+    const auto gone = MakeRequest();
+    gate.Enter(1, a, now);
+    gate.Enter(1, gone, now);
+    gate.Withdraw(gone);
+    return gone;
+  }();
+  EXPECT_TRUE(weak.expired());
+}
+
+}  // namespace
+
+}  // namespace SsoClient::Access

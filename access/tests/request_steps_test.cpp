@@ -1,0 +1,229 @@
+#include <atomic>
+#include <stdexcept>
+#include <thread>
+
+#include <gtest/gtest.h>
+
+#include <ssoclient/exceptions.h>
+
+#include "support/source_fixture.h"
+
+namespace SsoClient::Access::Testing {
+
+namespace {
+
+using Limit = Tarnik::Http::CallLimit;
+
+// ---- the functions of the login
+
+class LoginFunctionTest : public SourceFixture {};
+
+TEST_F(LoginFunctionTest, ItsExceptionReachesTheCallersAndNothingIsSentOrKept) {
+  bool isBroken = true;
+  config.login = PasswordLogin{"alice", [&]() -> std::string {
+                                 if (isBroken) {
+                                   throw Tarnik::IOException("The vault does not answer.");
+                                 }
+                                 return "secret";
+                               }};
+  Make();
+  const Reply reply = Get(spec);
+  EXPECT_TRUE(reply.Is<Tarnik::IOException>());
+  EXPECT_EQ(reply.Message(), "The vault does not answer.");
+  EXPECT_EQ(Attempts(), 0U);
+  isBroken = false;
+  EXPECT_NE(Get(spec).token, nullptr);
+}
+
+TEST_F(LoginFunctionTest, ExceptionOfAnotherLibraryReachesBlockedCallersUnchanged) {
+  config.login =
+      PasswordLogin{"alice", []() -> std::string { throw std::out_of_range("no entry"); }};
+  Make();
+  const Reply reply = Get(spec);
+  EXPECT_TRUE(reply.Is<SsoException>());
+  EXPECT_EQ(reply.Message(), "no entry");
+  std::atomic<bool> isDone{false};
+  std::thread caller([&] {
+    EXPECT_THROW(source->GetToken(spec, {}), std::out_of_range);
+    isDone = true;
+    runtime->Run([] {});
+  });
+  runtime->RunUntil([&] { return isDone.load(); });
+  caller.join();
+}
+
+TEST_F(LoginFunctionTest, EmptyPasswordIsRefusedBeforeItIsSent) {
+  password = "";
+  Make();
+  EXPECT_TRUE(Get(spec).Is<Tarnik::InvalidArgumentException>());
+  EXPECT_EQ(Attempts(), 0U);
+}
+
+TEST_F(LoginFunctionTest, EveryAttemptAsksForThePassword) {
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    password = "changed";
+    return Unreachable();
+  });
+  Make();
+  EXPECT_NE(Get(spec).token, nullptr);
+  ASSERT_EQ(scripts[1]->Count(), 1U);
+  EXPECT_EQ(scripts[1]->Seen()[0].secret, "changed");
+}
+
+TEST_F(LoginFunctionTest, NoRecordContainsThePassword) {
+  ForAll(Fails(Refused()));
+  Make();
+  const Reply reply = Get(spec);
+  EXPECT_EQ(reply.Message().find(password), std::string::npos);
+  for (const AttemptRecord& record : listener->Ended()) {
+    EXPECT_EQ((record.message + record.source + record.endpoint).find(password), std::string::npos);
+  }
+  EXPECT_EQ(listener->Ended().size(), 1U);
+}
+
+// ---- renewals
+
+class RenewalTest : public SourceFixture {
+ protected:
+  RenewalTest() {
+    own_ = Tarnik::MakeRef<NamedCertificate>("own");
+    config.holderOfKey = HolderOfKeyConfig{own_, nullptr};
+    config.refresh.jitter = 0;
+    ForAll(IssuesBound(true, own_));
+  }
+
+  Script::Function IssuesBound(bool isRenewable,
+                               const Tarnik::Ref<const Tarnik::Crypto::Certificate>& to) {
+    return [this, isRenewable, to](const AttemptRequest&, Limit&) {
+      const auto token = NewToken(hours(1));
+      token->isRenewable = isRenewable;
+      token->certificate = to;
+      return Issued(token);
+    };
+  }
+  // A token that callers have asked for, at the time of its refresh.
+  std::string RefreshOne() {
+    const Reply reply = Get(spec);
+    EXPECT_NE(source->TryGetToken(spec), nullptr);
+    runtime->Advance(minutes(45));
+    return reply.token->Id();
+  }
+
+  Tarnik::Ref<const Tarnik::Crypto::Certificate> own_;
+};
+
+TEST_F(RenewalTest, BoundRenewableTokenIsRenewed) {
+  Make();
+  const std::string id = RefreshOne();
+  ASSERT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kRenewal);
+  EXPECT_EQ(scripts[0]->Seen()[1].base, id);
+  EXPECT_EQ(scripts[0]->Seen()[1].secret, "");
+  EXPECT_NE(source->TryGetToken(spec)->Id(), id);
+  EXPECT_EQ(source->Metrics().renewals, 1U);
+  EXPECT_EQ(passwordCalls, 1);
+}
+
+TEST_F(RenewalTest, TokenThatIsNotRenewableIsNotAskedFor) {
+  ForAll(IssuesBound(false, own_));
+  Make();
+  RefreshOne();
+  ASSERT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kLogin);
+}
+
+TEST_F(RenewalTest, TokenOfAnotherKeyIsNotRenewed) {
+  ForAll(IssuesBound(true, Tarnik::MakeRef<NamedCertificate>("other")));
+  Make();
+  RefreshOne();
+  ASSERT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kLogin);
+}
+
+TEST_F(RenewalTest, BearerTokenIsNotRenewed) {
+  ForAll(IssuesBound(true, nullptr));
+  Make();
+  RefreshOne();
+  ASSERT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kLogin);
+}
+
+TEST_F(RenewalTest, FailedRenewalLogsInAlsoWithOneAttempt) {
+  config.retry.attempts = 1;
+  scripts[0]->Set(
+      [&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+        return request.operation == AttemptOperation::kRenewal ? Fault() : issue(request, limit);
+      });
+  Make();
+  RefreshOne();
+  ASSERT_EQ(scripts[0]->Count(), 3U);
+  EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kRenewal);
+  EXPECT_EQ(scripts[0]->Seen()[2].operation, AttemptOperation::kLogin);
+  EXPECT_EQ(scripts[1]->Count(), 0U);
+  EXPECT_EQ(listener->Begun()[1].number, 1);
+  EXPECT_EQ(listener->Begun()[2].number, 2);
+}
+
+TEST_F(RenewalTest, FailedRenewalLeavesAllAttemptsToTheLogin) {
+  config.endpoints.resize(1);
+  config.retry.attempts = 2;
+  config.retry.firstDelay = milliseconds(0);
+  Make();
+  Get(spec);
+  int logins = 0;
+  scripts[0]->Set(
+      [&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+        if (request.operation == AttemptOperation::kRenewal) {
+          return Fault();
+        }
+        return ++logins == 1 ? Unreachable() : issue(request, limit);
+      });
+  CallContext context;
+  context.minimumLife = minutes(50);
+  runtime->Advance(minutes(20));
+  EXPECT_NE(Get(spec, context).token, nullptr);
+  EXPECT_EQ(logins, 2);
+}
+
+TEST_F(RenewalTest, RenewalThatNoServiceDecidedIsRepeatedAtTheNextEndpoint) {
+  Make();
+  Get(spec);
+  source->TryGetToken(spec);
+  scripts[0]->Set(Fails(Unreachable()));
+  runtime->Advance(minutes(45));
+  ASSERT_EQ(scripts[1]->Count(), 1U);
+  EXPECT_EQ(scripts[1]->Seen()[0].operation, AttemptOperation::kRenewal);
+}
+
+TEST_F(RenewalTest, RefusedRenewalIsNotARefusedLogin) {
+  scripts[0]->Set(
+      [&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+        return request.operation == AttemptOperation::kRenewal ? Refused() : issue(request, limit);
+      });
+  Make();
+  RefreshOne();
+  EXPECT_EQ(scripts[0]->Count(), 3U);
+  EXPECT_NE(Get(SpecFor("https://other.example.com")).token, nullptr);
+}
+
+TEST_F(RenewalTest, TokenThatHasEndedIsNotRenewed) {
+  Make();
+  Get(spec);
+  runtime->MoveWallClock(hours(2));
+  EXPECT_NE(Get(spec).token, nullptr);
+  ASSERT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kLogin);
+}
+
+TEST_F(RenewalTest, InvalidatedTokenIsNotRenewed) {
+  Make();
+  const Reply reply = Get(spec);
+  source->Invalidate(*reply.token);
+  Get(spec);
+  ASSERT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[0]->Seen()[1].operation, AttemptOperation::kLogin);
+}
+
+}  // namespace
+
+}  // namespace SsoClient::Access::Testing

@@ -1,0 +1,122 @@
+#include "token_source_impl.h"
+
+#include <thread>
+
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include "support/source_fixture.h"
+
+namespace SsoClient::Access::Testing {
+
+namespace {
+
+class TokenSourceImplTest : public SourceFixture {
+ protected:
+  // The exit status of a child that runs `body` and ends with its result.
+  template <class Body>
+  static int InChild(const Body& body) {
+    const pid_t child = fork();
+    if (child == 0) {
+      alarm(20);
+      _exit(body());
+    }
+    int status = -1;
+    EXPECT_EQ(waitpid(child, &status, 0), child);
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  }
+};
+
+TEST_F(TokenSourceImplTest, ChildBeginsWithAnEmptyCache) {
+  Make();
+  const Reply reply = Get(spec);
+  EXPECT_EQ(InChild([&] {
+              if (source->TryGetToken(spec) != nullptr) {
+                return 1;
+              }
+              const Reply own = Get(spec);
+              return own.token != nullptr && own.token != reply.token ? 0 : 2;
+            }),
+            0);
+  EXPECT_EQ(source->TryGetToken(spec), reply.token);
+}
+
+TEST_F(TokenSourceImplTest, ChildIsNotBlockedByWhatTheParentWasDoing) {
+  config.keepFresh = {SpecFor("https://kept.example.com")};
+  Make();
+  int status = -1;
+  scripts[0]->Set([&](const AttemptRequest&, Tarnik::Http::CallLimit&) {
+    status = InChild([&] {
+      ForAll(Issues(hours(1)));
+      const Reply own = Get(spec);
+      source->Stop(milliseconds(0));
+      source.reset();
+      return own.token != nullptr ? 0 : 1;
+    });
+    return Issued(NewToken(hours(1)));
+  });
+  const Reply reply = Get(spec);
+  EXPECT_EQ(status, 0);
+  EXPECT_EQ(reply.calls, 1);
+  EXPECT_NE(reply.token, nullptr);
+}
+
+TEST_F(TokenSourceImplTest, ChildMayDestroyASourceThatItHasNotUsed) {
+  Make();
+  Get(spec);
+  EXPECT_EQ(InChild([&] {
+              source.reset();
+              return 0;
+            }),
+            0);
+}
+
+TEST_F(TokenSourceImplTest, CallsOfTheParentAreNotAnsweredInTheChild) {
+  Make();
+  const auto reply = Ask(spec);
+  EXPECT_EQ(InChild([&] {
+              source.reset();
+              runtime->DropWork();
+              return reply->calls;
+            }),
+            0);
+  runtime->Settle();
+  EXPECT_EQ(reply->calls, 1);
+}
+
+TEST_F(TokenSourceImplTest, SourceThatWasStoppedIsStoppedInTheChild) {
+  Make();
+  source->Stop(milliseconds(0));
+  EXPECT_EQ(InChild([&] {
+              try {
+                source->GetToken(spec, {});
+              } catch (const Tarnik::InvalidStateException&) {
+                return 0;
+              }
+              return 1;
+            }),
+            0);
+}
+
+TEST_F(TokenSourceImplTest, DestructionStopsTheSource) {
+  Make();
+  std::thread destroying;
+  scripts[0]->Set([&](const AttemptRequest&, Tarnik::Http::CallLimit& limit) {
+    destroying = std::thread([this] { source.reset(); });
+    while (!limit.IsCancelled()) {
+      std::this_thread::yield();
+    }
+    return Unreachable();
+  });
+  const auto reply = Ask(spec);
+  runtime->RunUntil([&] { return reply->Has(); });
+  destroying.join();
+  EXPECT_TRUE(reply->Is<Tarnik::InvalidStateException>());
+  EXPECT_EQ(reply->calls, 1);
+  EXPECT_EQ(Attempts(), 1U);
+}
+
+}  // namespace
+
+}  // namespace SsoClient::Access::Testing

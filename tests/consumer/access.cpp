@@ -1,0 +1,73 @@
+#include <chrono>
+#include <cstddef>
+#include <iostream>
+#include <string>
+
+#include <ssoclient/access/call_context.h>
+#include <ssoclient/access/failure_kind.h>
+#include <ssoclient/access/token_source.h>
+#include <ssoclient/ssoclient.h>
+
+namespace {
+
+using SsoClient::Access::FailureKind;
+
+bool ClassifiesRefusedLogins() {
+  const FailureKind kind =
+      SsoClient::Access::Classify(SsoClient::InvalidCredentialsException("refused"));
+  return kind == FailureKind::kRefusedLogin &&
+         SsoClient::Access::NameOf(kind) == std::string("refused-login") &&
+         !SsoClient::Access::AllowsFailover(kind);
+}
+
+bool ReportsCancellation() {
+  const SsoClient::Access::CancellationSource source;
+  bool hasRun = false;
+  const auto registration = source.Token().OnCancel([&hasRun] { hasRun = true; });
+  source.Cancel();
+  return hasRun;
+}
+
+SsoClient::Access::TokenSourceConfig UnreachableSource() {
+  SsoClient::Access::TokenSourceConfig config;
+  config.endpoints = {{"http://127.0.0.1:1/sts", ""}};
+  config.tokenFactory = SsoClient::CreateSamlTokenFactory(nullptr);
+  config.login = SsoClient::Access::PasswordLogin{"user", [] { return std::string("password"); }};
+  config.retry.attempts = 1;
+  config.listener = SsoClient::Access::CreateLogListener();
+  return config;
+}
+
+bool ReportsAnUnreachableEndpoint() {
+  const auto source = SsoClient::Access::CreateTokenSource(UnreachableSource());
+  SsoClient::TokenSpec spec;
+  spec.tokenLifetimeSec = 60;
+  try {
+    source->GetToken(spec, SsoClient::Access::CallContext::Within(std::chrono::seconds(20)));
+  } catch (const SsoClient::CommunicationException&) {
+    const auto kind = static_cast<std::size_t>(FailureKind::kUnreachable);
+    return source->Metrics().attempts.at(kind) == 1;
+  }
+  return false;
+}
+
+bool RefusesASourceWithoutEndpoints() {
+  try {
+    SsoClient::Access::CreateTokenSource({});
+  } catch (const Tarnik::InvalidArgumentException& e) {
+    return std::string(e.what()) == "There is no endpoint.";
+  }
+  return false;
+}
+
+}  // namespace
+
+int main() {
+  if (!ClassifiesRefusedLogins() || !ReportsCancellation() || !ReportsAnUnreachableEndpoint() ||
+      !RefusesASourceWithoutEndpoints()) {
+    std::cerr << "The installed library of token sources does not work as expected.\n";
+    return 1;
+  }
+  std::cout << "The installed library of token sources works.\n";
+  return 0;
+}
