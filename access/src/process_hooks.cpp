@@ -14,20 +14,27 @@ namespace SsoClient::Access {
 
 namespace {
 
-// Never destroyed, and replaced in a forked child, where its lock may be held by nobody.
+// Never destroyed. A forked child makes a new one, since a thread that the child does not have may
+// hold the lock of this one.
 struct Registry {
+  /// The one of the parent process, unused, so that leak checkers find it.
+  const Registry* inherited = nullptr;
   std::mutex mutex;
   std::vector<std::weak_ptr<Core>> cores;
 };
 
 std::atomic<std::uint64_t> generation{0};
 std::atomic<Registry*> registry{nullptr};
+std::atomic<Registry*> inheritedRegistry{nullptr};
 std::atomic<bool> isEndWatched{false};
 
 // Only what a signal handler may do as well.
 void BeginChild() noexcept {
   generation.fetch_add(1, std::memory_order_relaxed);
-  registry.store(nullptr, std::memory_order_relaxed);
+  Registry* const own = registry.exchange(nullptr, std::memory_order_relaxed);
+  if (own != nullptr) {
+    inheritedRegistry.store(own, std::memory_order_relaxed);
+  }
 }
 
 [[maybe_unused]] const bool kTakesPartInFork = pthread_atfork(nullptr, nullptr, &BeginChild) == 0;
@@ -36,6 +43,7 @@ Registry& OwnRegistry() {
   Registry* current = registry.load(std::memory_order_acquire);
   if (current == nullptr) {
     auto created = std::make_unique<Registry>();
+    created->inherited = inheritedRegistry.load(std::memory_order_relaxed);
     if (registry.compare_exchange_strong(current, created.get(), std::memory_order_acq_rel)) {
       current = created.release();
     }

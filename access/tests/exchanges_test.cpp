@@ -1,3 +1,5 @@
+#include <utility>
+
 #include <gtest/gtest.h>
 
 #include <ssoclient/exceptions.h>
@@ -119,7 +121,7 @@ TEST_F(ExchangeTest, CallToTheOtherSourceEndsWithTheLastCaller) {
   EXPECT_TRUE(base->lastContext.cancellation.IsCancelled());
   EXPECT_EQ(reply->Message(),
             "The deadline passed while the call was waiting for the token to exchange.");
-  base->held(base->token, nullptr);
+  std::exchange(base->held, nullptr)(base->token, nullptr);
   runtime->Settle();
   EXPECT_EQ(Attempts(), 0U);
 }
