@@ -36,15 +36,30 @@ std::string DurationText(unsigned long microseconds) {
 }
 
 // What an exchange without a connection is waiting for.
-const char* DescribeConnect(const System::CancellableItem* connect) noexcept {
+ExchangeStage ConnectStageOf(const System::CancellableItem* connect) noexcept {
   const auto* progress = dynamic_cast<const System::ConnectProgress*>(connect);
   switch (progress == nullptr ? System::ConnectStage::kConnection : progress->Stage()) {
     case System::ConnectStage::kLookUp:
-      return "the host look-up";
+      return ExchangeStage::kLookUp;
     case System::ConnectStage::kConnection:
-      return "the connection";
+      return ExchangeStage::kConnection;
     default:
+      return ExchangeStage::kHandshake;
+  }
+}
+
+const char* Describe(ExchangeStage stage) noexcept {
+  switch (stage) {
+    case ExchangeStage::kLookUp:
+      return "the host look-up";
+    case ExchangeStage::kConnection:
+      return "the connection";
+    case ExchangeStage::kHandshake:
       return "the TLS handshake";
+    case ExchangeStage::kSending:
+      return "the request to be sent";
+    default:
+      return "the answer";  // or the rest of it
   }
 }
 
@@ -199,8 +214,12 @@ void Exchange::OnWritten(const Exception* error) {
 
 void Exchange::OnRead(const Ref<Connection>& connection, std::string_view bytes,
                       const Exception* error) {
-  if (HasEnded()) {
-    return;
+  {
+    const std::lock_guard guard(mutex_);
+    if (hasEnded_) {
+      return;
+    }
+    hasAnswerBegun_ = hasAnswerBegun_ || !bytes.empty();
   }
   if (const auto failure = Parse(bytes, error)) {
     Fail(*failure);
@@ -273,11 +292,6 @@ void Exchange::TakeOverAnswer(const ClientResponseImpl& response, const PendingW
 void Exchange::SetFailure(const Exception& failure) noexcept {
   const std::lock_guard guard(mutex_);
   outcome_ = {CopyException(failure), nullptr};
-}
-
-bool Exchange::HasEnded() {
-  const std::lock_guard guard(mutex_);
-  return hasEnded_;
 }
 
 bool Exchange::Cancel() {
@@ -366,15 +380,25 @@ void Exchange::EndWithProcess() {
 
 TimeoutException Exchange::NoAnswer(unsigned long microseconds) {
   return TimeoutException("No answer from " + endpoint_.key + " within " +
-                          DurationText(microseconds) + ": waiting for " + DescribeStage() + ".");
+                          DurationText(microseconds) + ": waiting for " + Describe(Stage()) + ".");
 }
 
-const char* Exchange::DescribeStage() {
-  const std::lock_guard guard(mutex_);
-  if (work_.connection == nullptr) {
-    return DescribeConnect(work_.connect.get());
+ExchangeStage Exchange::Stage() noexcept {
+  // A thread of the parent may have held the lock.
+  if (mark_.IsFromParent()) {
+    return ExchangeStage::kNone;
   }
-  return isWritten_ ? "the answer" : "the request to be sent";
+  const std::lock_guard guard(mutex_);
+  if (hasEnded_) {
+    return ExchangeStage::kNone;
+  }
+  if (work_.connection == nullptr) {
+    return ConnectStageOf(work_.connect.get());
+  }
+  if (!isWritten_) {
+    return ExchangeStage::kSending;
+  }
+  return hasAnswerBegun_ ? ExchangeStage::kRestOfAnswer : ExchangeStage::kAnswer;
 }
 
 std::optional<Exchange::PendingWork> Exchange::Settle(Outcome outcome) {
