@@ -81,7 +81,7 @@ TEST_F(CoreTest, CallerThatLeavesAtItsDeadlineDoesNotEndTheExchangeOfOthers) {
   ASSERT_TRUE(hasty->Has());
   EXPECT_TRUE(hasty->Is<CommunicationException>());
   EXPECT_EQ(hasty->Message(),
-            "The deadline passed while the call was waiting for the answer of "
+            "The deadline passed while the call was waiting for the attempt at "
             "https://a.example.com/sts.");
   ASSERT_TRUE(patient->Has());
   EXPECT_NE(patient->token, nullptr);
