@@ -55,6 +55,8 @@ Core::Core(Parts parts)
       activity_(std::make_shared<Activity>()),
       stopped_(StoppedFailure()),
       processEnding_(ProcessEndFailure()),
+      refused_(Failure::Of(InvalidCredentialsException("The service has refused the login."))),
+      expired_(Failure::Of(PasswordExpiredException("The password has expired."))),
       cache_(config_->cache.capacity),
       endpoints_(config_->retry, std::move(parts.clients)),
       gate_(config_->retry.refusalMemory) {}

@@ -111,6 +111,7 @@ class Core : public std::enable_shared_from_this<Core> {
                  const Failure& refusal, const Instant& now) noexcept;
   void WithdrawFromGate(Section& section, const RequestPtr& request) noexcept;
   Result Perform(const Step& step, const Request& request, const std::string& secret) noexcept;
+  Failure ToRemember(const Failure& failure, const std::string& secret) const noexcept;
   void InvalidateBase(const Step& step) noexcept;
 
   // turns: request_turns.cpp
@@ -169,6 +170,9 @@ class Core : public std::enable_shared_from_this<Core> {
   const SecretTagger tagger_;
   const Failure stopped_;
   const Failure processEnding_;
+  // What is remembered of a refusal without memory for a copy.
+  const Failure refused_;
+  const Failure expired_;
   std::atomic<State> state_{State::kRunning};
   TokenCache cache_;
   Counters counters_;

@@ -88,9 +88,12 @@ void Core::LookAt(Section& section, const KeyPtr& key, const Instant& now) {
     return;
   }
   RefreshInBackground(section, key);
-  // The end of the request sets another time.
-  schedule_.Set(key, entry != nullptr ? std::max(entry->Life().end.steady, now.steady + kNextLook)
-                                      : now.steady + config_->retry.longestDelay + kNextLook);
+  // The end of the request sets another time, unless there is no memory for a timer then.
+  Instant::Steady next = now.steady + config_->retry.longestDelay + kNextLook;
+  if (entry != nullptr) {
+    next = std::min(next, std::max(entry->Life().end.steady, now.steady + kNextLook));
+  }
+  schedule_.Set(key, next);
 }
 
 void Core::RefreshInBackground(Section& section, const KeyPtr& key) {
@@ -181,16 +184,16 @@ void Core::ArmTimer(Section& section, Instant::Steady earliest) noexcept {
   if (timer_ != nullptr && timerAt_ <= at) {
     return;
   }
-  section.Cancel(std::exchange(timer_, nullptr));
-  timerAt_ = at;
   try {
-    timer_ = runtime_->RunAt(timerAt_, [core = weak_from_this()] {
+    auto timer = runtime_->RunAt(at, [core = weak_from_this()] {
       if (const auto self = core.lock()) {
         self->RunDue();
       }
     });
+    section.Cancel(std::exchange(timer_, std::move(timer)));
+    timerAt_ = at;
   } catch (...) {
-    // No timer now. The next change of the schedule, or the next request, tries again.
+    // The timer stays as it is. The next change of the schedule, or the next request, tries again.
   }
 }
 

@@ -52,20 +52,6 @@ Failure Reworded(const Failure& failure, const std::string& text) {
                                               : Failure::Of(SsoException(text));
 }
 
-// A refusal outlives the call that it was the answer to, so it must not contain the password.
-Failure ToRemember(const Failure& failure, const std::string& secret) noexcept {
-  const FailureKind kind = failure.Kind();
-  if (kind != FailureKind::kRefusedLogin && kind != FailureKind::kExpiredPassword) {
-    return {};
-  }
-  const Failure remembered = Failure::Made([&] {
-    const std::string text = failure.Message();
-    const std::string shown = HideSecret(text, secret);
-    return shown == text ? failure : Reworded(failure, shown);
-  });
-  return remembered.WithKind(kind);
-}
-
 }  // namespace
 
 // Throws when there is no worker.
@@ -235,6 +221,21 @@ Result Core::Perform(const Step& step, const Request& request, const std::string
     result.refusal = ToRemember(result.failure, secret);
   }
   return result;
+}
+
+// A refusal outlives the call that it was the answer to, so it must not contain the password.
+Failure Core::ToRemember(const Failure& failure, const std::string& secret) const noexcept {
+  const FailureKind kind = failure.Kind();
+  if (kind != FailureKind::kRefusedLogin && kind != FailureKind::kExpiredPassword) {
+    return {};
+  }
+  try {
+    const std::string text = failure.Message();
+    const std::string shown = HideSecret(text, secret);
+    return shown == text ? failure : Reworded(failure, shown).WithKind(kind);
+  } catch (const std::bad_alloc&) {
+    return kind == FailureKind::kRefusedLogin ? refused_ : expired_;
+  }
 }
 
 // Without memory, the next refusal does it.

@@ -11,7 +11,6 @@
 
 #include "core/copy_exception.h"
 #include "support/process_end.h"
-#include "system/connect_stage.h"
 #include "system/post_with.h"
 
 namespace Tarnik::Http {
@@ -33,34 +32,6 @@ std::string DurationText(unsigned long microseconds) {
     return std::to_string(microseconds / kPerMillisecond) + " milliseconds";
   }
   return std::to_string(microseconds) + " microseconds";
-}
-
-// What an exchange without a connection is waiting for.
-ExchangeStage ConnectStageOf(const System::CancellableItem* connect) noexcept {
-  const auto* progress = dynamic_cast<const System::ConnectProgress*>(connect);
-  switch (progress == nullptr ? System::ConnectStage::kConnection : progress->Stage()) {
-    case System::ConnectStage::kLookUp:
-      return ExchangeStage::kLookUp;
-    case System::ConnectStage::kConnection:
-      return ExchangeStage::kConnection;
-    default:
-      return ExchangeStage::kHandshake;
-  }
-}
-
-const char* Describe(ExchangeStage stage) noexcept {
-  switch (stage) {
-    case ExchangeStage::kLookUp:
-      return "the host look-up";
-    case ExchangeStage::kConnection:
-      return "the connection";
-    case ExchangeStage::kHandshake:
-      return "the TLS handshake";
-    case ExchangeStage::kSending:
-      return "the request to be sent";
-    default:
-      return "the answer";  // or the rest of it
-  }
 }
 
 // The failure that `make` returns, or `OutOfMemory()`.
