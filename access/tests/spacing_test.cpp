@@ -83,7 +83,7 @@ class SpacingTest : public SourceFixture, public ::testing::WithParamInterface<C
 };
 
 TEST_P(SpacingTest, EndpointThatIsDownForADayReceivesTheStatedNumber) {
-  MakeWithKeys(50);
+  MakeWithKeys(10);
   FailForADay(Unreachable());
   for (const std::size_t endpoint : {0U, 1U}) {
     EXPECT_LE(MostInAnHour(endpoint), 120U);
@@ -103,14 +103,14 @@ TEST_P(SpacingTest, ServiceThatRefusesTheRefreshesOfAKeyReceivesTheStatedNumber)
 }
 
 TEST_P(SpacingTest, WrongPasswordIsSentOnceInTheStatedTime) {
-  MakeWithKeys(20);
+  MakeWithKeys(5);
   FailForADay(Refused());
   EXPECT_LE(MostInAnHour(0) + MostInAnHour(1), 12U);
   EXPECT_GE(All(0) + All(1), 24U * 8);
 }
 
 TEST_P(SpacingTest, RetryAfterSpacesThemFurther) {
-  MakeWithKeys(20);
+  MakeWithKeys(5);
   FailForADay(Unavailable(minutes(4)));
   EXPECT_LE(MostInAnHour(0), 15U);
   EXPECT_LE(MostInAnHour(1), 15U);
@@ -118,12 +118,12 @@ TEST_P(SpacingTest, RetryAfterSpacesThemFurther) {
 }
 
 TEST_P(SpacingTest, FirstSuccessEndsAnOutageAtOnceForAllKeys) {
-  MakeWithKeys(50);
+  MakeWithKeys(10);
   FailForADay(Unreachable());
   ForAll(Issues(hours(24 * 30)));
   // The longest pause, and the spread afterwards.
   runtime->Advance(minutes(1) + seconds(1));
-  EXPECT_EQ(source->Metrics().logins, 100U);
+  EXPECT_EQ(source->Metrics().logins, 20U);
 }
 
 INSTANTIATE_TEST_SUITE_P(Chances, SpacingTest, ::testing::Values(Chance::kRandom, Chance::kLowest));
