@@ -20,8 +20,11 @@ milliseconds Ceiling(const RetryConfig& config, int failures) {
 
 milliseconds Backoff(const RetryConfig& config, int failures, milliseconds retryAfter,
                      double draw) {
-  const auto ceiling = static_cast<double>(Ceiling(config, failures).count());
-  const milliseconds jittered(static_cast<milliseconds::rep>(ceiling * draw));
+  // The lower half is not random, since random pauses from zero on have no bound of their number.
+  const milliseconds ceiling = Ceiling(config, failures);
+  const auto spread = static_cast<double>((ceiling / 2).count());
+  const milliseconds jittered =
+      ceiling - ceiling / 2 + milliseconds(static_cast<milliseconds::rep>(spread * draw));
   const milliseconds asked = std::clamp(retryAfter, milliseconds(0), config.longestRetryAfter);
   return asked + jittered;
 }

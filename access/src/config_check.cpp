@@ -52,6 +52,7 @@ void CheckRefresh(const RefreshConfig& refresh) {
 void CheckRetry(const RetryConfig& retry) {
   constexpr std::chrono::milliseconds kNone{0};
   Require(retry.attempts >= 1, "The number of attempts is not positive.");
+  Require(retry.attemptsAtOnce >= 1, "The number of attempts at once is not positive.");
   Require(retry.attemptTimeout > kNone && retry.attemptTimeout <= kLongestAttempt,
           "The limit of an attempt is not between 1 ms and 240 s.");
   Require(retry.firstDelay >= kNone && retry.longestDelay >= kNone,

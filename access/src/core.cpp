@@ -9,6 +9,7 @@
 
 #include "config_check.h"
 #include "section.h"
+#include "stage.h"
 
 namespace SsoClient::Access {
 
@@ -35,20 +36,9 @@ Failure TooShortFailure(std::chrono::microseconds granted, std::chrono::seconds 
                                   std::to_string(minimumLife.count()) + " s."));
 }
 
-Failure DeadlineFailure(const Request& request) {
-  std::string text = "The deadline passed while the call was waiting for " + request.stage + ".";
-  if (request.lastFailure.IsSet()) {
-    text += " The last attempt had failed: " + request.lastFailure.Message();
-  }
-  return Failure::Of(CommunicationException(text));
-}
-
-Failure LeavingFailure(const Request& request, bool isDeadline) noexcept {
-  try {
-    return isDeadline ? DeadlineFailure(request) : CancelledFailure();
-  } catch (const std::bad_alloc&) {
-    return Failure::OutOfMemory();
-  }
+// The exchange under way of a request that waits for an attempt.
+Tarnik::Http::ExchangeStage ExchangeStageOf(const Request& request) noexcept {
+  return request.limit == nullptr ? Tarnik::Http::ExchangeStage::kNone : request.limit->Stage();
 }
 
 }  // namespace
@@ -63,6 +53,10 @@ Core::Core(Parts parts)
     : config_(std::move(parts.config)),
       runtime_(std::move(parts.runtime)),
       activity_(std::make_shared<Activity>()),
+      stopped_(StoppedFailure()),
+      processEnding_(ProcessEndFailure()),
+      refused_(Failure::Of(InvalidCredentialsException("The service has refused the login."))),
+      expired_(Failure::Of(PasswordExpiredException("The password has expired."))),
       cache_(config_->cache.capacity),
       endpoints_(config_->retry, std::move(parts.clients)),
       gate_(config_->retry.refusalMemory) {}
@@ -74,9 +68,9 @@ void Core::RequireRunning() const {
     case State::kRunning:
       return;
     case State::kStopped:
-      StoppedFailure().Throw();
+      stopped_.Throw();
     case State::kProcessEnding:
-      ProcessEndFailure().Throw();
+      processEnding_.Throw();
   }
 }
 
@@ -156,9 +150,15 @@ void Core::RefreshLate(const TokenSpec& spec) noexcept {
 
 void Core::Wait(const TokenSpec& spec, const WaiterPtr& waiter) {
   RequestPtr begun;
-  {
+  try {
     Section section(*this);
     begun = Join(section, spec, waiter);
+  } catch (...) {
+    // The waiter is not known to a request.
+    if (const auto timer = std::exchange(waiter->deadlineTimer, nullptr)) {
+      timer->Cancel();
+    }
+    throw;
   }
   bool isRunning = false;
   try {
@@ -188,8 +188,7 @@ void Core::Wait(const TokenSpec& spec, const WaiterPtr& waiter) {
 // Returns the request if it is new and must be run.
 RequestPtr Core::Join(Section& section, const TokenSpec& spec, const WaiterPtr& waiter) {
   if (state_ != State::kRunning) {
-    section.GiveAnswer(
-        waiter, {nullptr, state_ == State::kStopped ? StoppedFailure() : ProcessEndFailure()});
+    section.GiveAnswer(waiter, {nullptr, state_ == State::kStopped ? stopped_ : processEnding_});
     return nullptr;
   }
   const SpecView view(spec);
@@ -211,11 +210,16 @@ RequestPtr Core::Join(Section& section, const TokenSpec& spec, const WaiterPtr& 
   const bool isNew = found == requests_.end();
   const RequestPtr request =
       isNew ? std::make_shared<Request>(MakeKey(spec), false, endpoints_.Size()) : found->second;
-  request->waiters.insert(waiter);
   if (isNew) {
+    request->waiters.insert(waiter);
     requests_.emplace(request->key, request);
+    // In case that there was no memory for the timer earlier.
+    ArmTimer(section);
+  } else {
+    request->waiters.insert(waiter);
   }
   waiter->request = request;
+  waiter->hasJoined = !isNew;
   ++waiting_;
   (isNew ? counters_.misses : counters_.shared).Add();
   return isNew ? request : nullptr;
@@ -237,16 +241,22 @@ boost::optional<Answer> Core::AnswerAtOnce(const SpecView& spec, const WaiterPtr
 
 // True when the waiter was still waiting; it then gets no answer.
 bool Core::Withdraw(const WaiterPtr& waiter) noexcept {
-  Section section(*this);
-  const RequestPtr request = std::exchange(waiter->request, nullptr);
-  if (request == nullptr) {
-    return false;
+  Tarnik::Ref<Tarnik::System::CancellableItem> timer;
+  {
+    Section section(*this);
+    const RequestPtr request = std::exchange(waiter->request, nullptr);
+    if (request == nullptr) {
+      return false;
+    }
+    timer = std::exchange(waiter->deadlineTimer, nullptr);
+    request->waiters.erase(waiter);
+    --waiting_;
+    if (request->waiters.empty() && !request->isBackground) {
+      Abandon(section, request, false);
+    }
   }
-  section.Cancel(waiter->deadlineTimer);
-  request->waiters.erase(waiter);
-  --waiting_;
-  if (request->waiters.empty() && !request->isBackground) {
-    Abandon(section, request, false);
+  if (timer != nullptr) {
+    timer->Cancel();
   }
   return true;
 }
@@ -257,24 +267,40 @@ void Core::Leave(const WaiterPtr& waiter, Leaving why) noexcept {
   if (request == nullptr) {
     return;
   }
-  section.GiveAnswer(waiter, {nullptr, LeavingFailure(*request, why == Leaving::kDeadline)});
-  section.Cancel(waiter->deadlineTimer);
+  const bool isDeadline = why == Leaving::kDeadline;
+  section.GiveAnswer(waiter, {nullptr, isDeadline ? DeadlineFailure(*request, *waiter)
+                                                  : Failure::Made(CancelledFailure)});
   request->waiters.erase(waiter);
   --waiting_;
   if (request->waiters.empty() && !request->isBackground) {
-    Abandon(section, request, why == Leaving::kDeadline);
+    Abandon(section, request, isDeadline);
   }
 }
 
-void Core::Abandon(Section& section, const RequestPtr& request, bool hasWaitedInVain) {
+Failure Core::DeadlineFailure(const Request& request, const Waiter& waiter) const noexcept {
+  return Failure::Made([&] {
+    std::string text = "The deadline passed while the call was waiting for ";
+    if (waiter.hasJoined) {
+      text += request.isBackground ? "a request of the source, which was waiting for "
+                                   : "the request of another call, which was waiting for ";
+    }
+    text +=
+        Describe(request.stage, endpoints_.Url(request.endpoint), ExchangeStageOf(request)) + ".";
+    if (request.lastFailure.IsSet()) {
+      text += " The last attempt had failed: " + request.lastFailure.RecordText();
+    }
+    return Failure::Of(CommunicationException(text));
+  });
+}
+
+void Core::Abandon(Section& section, const RequestPtr& request, bool hasWaitedInVain) noexcept {
   request->hasWaitedInVain = hasWaitedInVain;
   Detach(section, request);
 }
 
-void Core::GiveAll(Section& section, const RequestPtr& request, const Failure& failure) {
+void Core::GiveAll(Section& section, const RequestPtr& request, const Failure& failure) noexcept {
   for (const WaiterPtr& waiter : request->waiters) {
     waiter->request = nullptr;
-    section.Cancel(waiter->deadlineTimer);
     section.GiveAnswer(waiter, {nullptr, failure});
   }
   waiting_ -= request->waiters.size();
@@ -282,15 +308,16 @@ void Core::GiveAll(Section& section, const RequestPtr& request, const Failure& f
 }
 
 void Core::GiveAll(Section& section, const RequestPtr& request, const CacheEntry& entry,
-                   const Instant& now) {
+                   const Instant& now) noexcept {
   for (const WaiterPtr& waiter : request->waiters) {
     waiter->request = nullptr;
-    section.Cancel(waiter->deadlineTimer);
     const std::chrono::seconds minimumLife = waiter->Context().minimumLife;
     if (entry.Life().IsUsable(now, minimumLife)) {
       section.GiveAnswer(waiter, {entry.Token(), {}});
     } else {
-      section.GiveAnswer(waiter, {nullptr, TooShortFailure(entry.Life().granted, minimumLife)});
+      section.GiveAnswer(waiter, {nullptr, Failure::Made([&] {
+                                    return TooShortFailure(entry.Life().granted, minimumLife);
+                                  })});
     }
   }
   waiting_ -= request->waiters.size();
@@ -336,32 +363,29 @@ TokenSourceMetrics Core::Metrics() const {
 }
 
 bool Core::Stop(std::chrono::milliseconds wait) {
-  EndAll(State::kStopped, StoppedFailure());
+  EndAll(State::kStopped, stopped_);
   // The pool runs nothing more then.
   const bool isPoolStopped = Tarnik::System::IsProcessEnding();
   return activity_->WaitUntilIdle(isPoolStopped ? std::chrono::milliseconds(0) : wait);
 }
 
 void Core::EndProcess() noexcept {
+  EndAll(State::kProcessEnding, processEnding_);
   try {
-    EndAll(State::kProcessEnding, ProcessEndFailure());
     activity_->WaitUntilIdle(kExitLimit);
   } catch (...) {
-    // No memory: the pool ends what is under way.
+    // The pool ends what is under way.
   }
 }
 
-void Core::EndAll(State state, const Failure& failure) {
+void Core::EndAll(State state, const Failure& failure) noexcept {
   Section section(*this);
   if (state_ != State::kRunning) {
     return;
   }
   state_.store(state, std::memory_order_release);
-  std::vector<RequestPtr> requests;
-  for (const auto& [key, request] : requests_) {
-    requests.push_back(request);
-  }
-  for (const RequestPtr& request : requests) {
+  while (!requests_.empty()) {
+    const RequestPtr request = requests_.begin()->second;
     GiveAll(section, request, failure);
     Detach(section, request);
   }

@@ -21,11 +21,13 @@
 #include "runtime.h"
 #include "secret.h"
 #include "token_cache.h"
+#include "turn_queue.h"
 #include "waiter.h"
 
 namespace SsoClient::Access {
 
 class Section;
+struct Result;
 struct Step;
 
 /// A token source in one process. One lock protects its state; it is held only for short
@@ -35,7 +37,10 @@ struct Step;
 /// A request goes through steps on a worker thread: `Begin` chooses the operation, the login's
 /// function gives the secret, `Admit` chooses the endpoint, the attempt is made, and `Conclude`
 /// stores the token, ends the request, or goes on. A request that has to wait (for the gate of the
-/// login, a base token or a pause) leaves the worker, and is run again when it can go on.
+/// login, a base token, a pause, or its turn when too much is under way) leaves the worker, and is
+/// run again when it can go on.
+///
+/// When memory runs out, a request ends with that failure; what is `noexcept` here needs none.
 class Core : public std::enable_shared_from_this<Core> {
  public:
   struct Parts {
@@ -79,11 +84,12 @@ class Core : public std::enable_shared_from_this<Core> {
                                        const Instant& now);
   bool Withdraw(const WaiterPtr& waiter) noexcept;
   void Leave(const WaiterPtr& waiter, Leaving why) noexcept;
-  void Abandon(Section& section, const RequestPtr& request, bool hasWaitedInVain);
-  void GiveAll(Section& section, const RequestPtr& request, const Failure& failure);
+  Failure DeadlineFailure(const Request& request, const Waiter& waiter) const noexcept;
+  void Abandon(Section& section, const RequestPtr& request, bool hasWaitedInVain) noexcept;
+  void GiveAll(Section& section, const RequestPtr& request, const Failure& failure) noexcept;
   void GiveAll(Section& section, const RequestPtr& request, const CacheEntry& entry,
-               const Instant& now);
-  void EndAll(State state, const Failure& failure);
+               const Instant& now) noexcept;
+  void EndAll(State state, const Failure& failure) noexcept;
 
   // steps of requests: request_steps.cpp
   void StartWork(const RequestPtr& request) noexcept;
@@ -95,54 +101,78 @@ class Core : public std::enable_shared_from_this<Core> {
   bool IsRenewable(const SamlToken& token) const;
   void RequestBase(const RequestPtr& request);
   void ReceiveBase(const RequestPtr& request, const std::shared_ptr<const SamlToken>& token,
-                   const Tarnik::Exception* failure);
+                   const Tarnik::Exception* failure) noexcept;
   bool RunLogin(const RequestPtr& request, Step& step);
   bool RunAttempt(const RequestPtr& request, Step& step, const std::string& secret);
   bool Admit(const RequestPtr& request, Step& step);
   bool MayLogIn(Section& section, const RequestPtr& request, const Step& step, const Instant& now);
   Failure RememberedRefusal(const RequestPtr& request, const Step& step, const Instant& now);
   void LeaveGate(Section& section, const RequestPtr& request, LoginVerdict verdict,
-                 const Failure& refusal, const Instant& now);
-  AttemptOutcome Perform(const Step& step, const Request& request, const std::string& secret);
+                 const Failure& refusal, const Instant& now) noexcept;
+  void WithdrawFromGate(Section& section, const RequestPtr& request) noexcept;
+  Result Perform(const Step& step, const Request& request, const std::string& secret) noexcept;
+  Failure ToRemember(const Failure& failure, const std::string& secret) const noexcept;
+  void InvalidateBase(const Step& step) noexcept;
+
+  // turns: request_turns.cpp
+  bool EnterFunction(const RequestPtr& request);
+  void ReturnFunction(Section& section) noexcept;
+  bool TakePlace(Section& section, const RequestPtr& request, const Instant& now);
+  void ReturnPlaces(Section& section, const RequestPtr& request) noexcept;
+  void ReturnPlace(Section& section, const RequestPtr& request) noexcept;
+  void ServeTurns(Section& section, const Instant& now) noexcept;
+  void WakeHopeless(Section& section, const Instant& now) noexcept;
 
   // outcomes: request_outcomes.cpp
-  bool Conclude(const RequestPtr& request, Step& step, AttemptOutcome outcome);
-  void NoteOutcome(Section& section, const RequestPtr& request, const Step& step,
-                   const AttemptOutcome& outcome, const Instant& now);
-  void NoteClock(Section& section, const Step& step, const AttemptOutcome& outcome);
+  bool Conclude(const RequestPtr& request, Step& step, Result result);
+  void NoteOutcome(Section& section, const RequestPtr& request, Step& step, Result& result,
+                   const Instant& now) noexcept;
+  void NoteCircuit(Section& section, const RequestPtr& request, const Step& step,
+                   const Result& result, const Instant& now) noexcept;
+  void NoteClock(Section& section, const Step& step, const AttemptOutcome& outcome) noexcept;
   LoginVerdict VerdictOf(FailureKind kind) const noexcept;
   void Accept(Section& section, const RequestPtr& request, const Step& step,
               const AttemptOutcome& outcome, const Instant& now);
+  void ReportDeviations(Section& section, const Step& step, const AttemptOutcome& outcome) noexcept;
   bool GoOnAfterFailure(Section& section, const RequestPtr& request, const Step& step,
-                        const AttemptOutcome& outcome, const Instant& now);
-  bool GoOnAfterDecision(Section& section, const RequestPtr& request, const Step& step,
-                         const AttemptOutcome& outcome, const Instant& now);
-  int AttemptLimit(const Request& request) const;
-  void EndRound(Section& section, const RequestPtr& request, const Instant& now);
-  void Pause(Section& section, const RequestPtr& request, Instant::Steady until);
+                        const Result& result, const Instant& now) noexcept;
+  bool GoOnAfterDecision(Section& section, const RequestPtr& request, Step& step,
+                         const Result& result, const Instant& now) noexcept;
+  void RememberRefusedExchange(const KeyPtr& key, const Failure& failure,
+                               const Instant& now) noexcept;
+  int AttemptLimit(const Request& request) const noexcept;
+  void EndRound(Section& section, const RequestPtr& request, const Instant& now) noexcept;
+  void Pause(Section& section, const RequestPtr& request, Instant::Steady until) noexcept;
   void Resume(const RequestPtr& request) noexcept;
-  void FailUndecided(Section& section, const RequestPtr& request, const Instant& now);
-  void Fail(Section& section, const RequestPtr& request, const Failure& failure, FailureKind kind,
-            const Instant& now);
-  void Detach(Section& section, const RequestPtr& request);
+  void FailUndecided(Section& section, const RequestPtr& request, const Instant& now) noexcept;
+  Failure SummaryOf(const Request& request, const Instant& now) const;
+  void Fail(Section& section, const RequestPtr& request, const Failure& failure,
+            const Instant& now) noexcept;
+  void Detach(Section& section, const RequestPtr& request) noexcept;
 
   // refreshes: refreshes.cpp
   void KeepFresh();
   void RunDue() noexcept;
+  void LookAtDue(Section& section, const Instant& now);
   void LookAt(Section& section, const KeyPtr& key, const Instant& now);
   void RefreshInBackground(Section& section, const KeyPtr& key);
   EntryPtr Store(Section& section, const KeyPtr& key, const std::shared_ptr<const SamlToken>& token,
                  const TokenLife& life, const Instant& now);
   void ScheduleAfterFailure(Section& section, const Request& request, const Failure& failure,
-                            FailureKind kind, const Instant& now);
-  void EndOutage(Section& section, const Instant& now);
-  void ArmTimer(Section& section);
-  bool IsPinned(const KeyPtr& key);
+                            const Instant& now) noexcept;
+  void EndOutage(Section& section, const Instant& now) noexcept;
+  void ArmTimer(Section& section, Instant::Steady earliest = Instant::Steady::min()) noexcept;
+  bool IsPinned(const KeyPtr& key) noexcept;
 
   const std::shared_ptr<const TokenSourceConfig> config_;
   const std::shared_ptr<Runtime> runtime_;
   const std::shared_ptr<Activity> activity_;
   const SecretTagger tagger_;
+  const Failure stopped_;
+  const Failure processEnding_;
+  // What is remembered of a refusal without memory for a copy.
+  const Failure refused_;
+  const Failure expired_;
   std::atomic<State> state_{State::kRunning};
   TokenCache cache_;
   Counters counters_;
@@ -150,7 +180,10 @@ class Core : public std::enable_shared_from_this<Core> {
 
   mutable std::mutex mutex_;
   EndpointSet endpoints_;
+  TurnQueue turns_;
   LoginGate gate_;
+  TurnQueue turnsOfFunction_;
+  int functionsUnderWay_ = 0;
   struct Refusal {
     Failure failure;
     Instant::Steady until;

@@ -15,23 +15,30 @@ milliseconds Until(Instant::Steady time, Instant::Steady now) {
   return std::max(std::chrono::ceil<milliseconds>(time - now), milliseconds(0));
 }
 
+// Each endpoint has a share of its own, so that those that are silent leave room for the others.
+std::size_t PlacesOfEach(const RetryConfig& config, std::size_t endpoints) {
+  const auto all = static_cast<std::size_t>(config.attemptsAtOnce);
+  return std::max<std::size_t>(all / std::max<std::size_t>(endpoints, 1), 1);
+}
+
 }  // namespace
 
 EndpointSet::EndpointSet(const RetryConfig& config,
-                         std::vector<std::unique_ptr<EndpointClient>> clients) {
+                         std::vector<std::unique_ptr<EndpointClient>> clients)
+    : places_(PlacesOfEach(config, clients.size())) {
   for (auto& client : clients) {
-    members_.push_back({std::move(client), Circuit(config), {}, milliseconds(0), false});
+    members_.push_back({std::move(client), Circuit(config), 0, {}, milliseconds(0), false});
   }
 }
 
-EndpointSet::Index EndpointSet::Nth(std::size_t n) const {
+EndpointSet::Index EndpointSet::Nth(std::size_t n) const noexcept {
   if (n == 0) {
     return preferred_;
   }
   return n <= preferred_ ? n - 1 : n;
 }
 
-bool EndpointSet::CanAdmit(const Asked& asked, Instant::Steady now) const {
+bool EndpointSet::CanAdmit(const Asked& asked, Instant::Steady now) const noexcept {
   for (Index index = 0; index < Size(); ++index) {
     if (!asked[index] && members_[index].circuit.CanAdmit(now)) {
       return true;
@@ -40,18 +47,32 @@ bool EndpointSet::CanAdmit(const Asked& asked, Instant::Steady now) const {
   return false;
 }
 
-EndpointSet::Admission EndpointSet::Admit(const Asked& asked, Instant::Steady now) {
-  for (std::size_t n = 0; n < Size(); ++n) {
-    const Index index = Nth(n);
-    const CircuitState before = members_[index].circuit.State();
-    if (!asked[index] && members_[index].circuit.Admit(now)) {
-      return {index, ChangeSince(before, index, now)};
-    }
-  }
-  return {};
+bool EndpointSet::HasPlace(Instant::Steady now) const noexcept {
+  return std::any_of(members_.begin(), members_.end(), [&](const Member& member) {
+    return member.underWay < places_ && member.circuit.CanAdmit(now);
+  });
 }
 
-EndpointSet::Change EndpointSet::OnAnswer(Index index) {
+std::optional<EndpointSet::Index> EndpointSet::TakePlace(const Asked& asked,
+                                                         Instant::Steady now) noexcept {
+  for (std::size_t n = 0; n < Size(); ++n) {
+    const Index index = Nth(n);
+    Member& member = members_[index];
+    if (!asked[index] && member.underWay < places_ && member.circuit.CanAdmit(now)) {
+      ++member.underWay;
+      return index;
+    }
+  }
+  return std::nullopt;
+}
+
+EndpointSet::Change EndpointSet::Begin(Index index, Instant::Steady now) noexcept {
+  const CircuitState before = members_[index].circuit.State();
+  members_[index].circuit.Admit(now);
+  return ChangeSince(before, index, now);
+}
+
+EndpointSet::Change EndpointSet::OnAnswer(Index index) noexcept {
   Member& member = members_[index];
   const CircuitState before = member.circuit.State();
   member.circuit.OnAnswer();
@@ -59,9 +80,9 @@ EndpointSet::Change EndpointSet::OnAnswer(Index index) {
   return ChangeSince(before, index, {});
 }
 
-EndpointSet::Change EndpointSet::OnFailure(Index index, const std::string& reason,
+EndpointSet::Change EndpointSet::OnFailure(Index index, const Reason& reason,
                                            milliseconds retryAfter, Instant::Steady now,
-                                           double draw) {
+                                           double draw) noexcept {
   Member& member = members_[index];
   const CircuitState before = member.circuit.State();
   member.lastReason = reason;
@@ -69,7 +90,7 @@ EndpointSet::Change EndpointSet::OnFailure(Index index, const std::string& reaso
   return ChangeSince(before, index, now);
 }
 
-EndpointSet::Change EndpointSet::OnAbandoned(Index index, bool hasWaitedInVain) {
+EndpointSet::Change EndpointSet::OnAbandoned(Index index, bool hasWaitedInVain) noexcept {
   Member& member = members_[index];
   const CircuitState before = member.circuit.State();
   member.circuit.OnAbandoned();
@@ -79,7 +100,7 @@ EndpointSet::Change EndpointSet::OnAbandoned(Index index, bool hasWaitedInVain) 
   return ChangeSince(before, index, {});
 }
 
-boost::optional<Instant::Steady> EndpointSet::ClosedAdmission() const {
+boost::optional<Instant::Steady> EndpointSet::ClosedAdmission() const noexcept {
   boost::optional<Instant::Steady> earliest;
   for (const Member& member : members_) {
     if (member.circuit.State() == CircuitState::kClosed) {
@@ -90,7 +111,7 @@ boost::optional<Instant::Steady> EndpointSet::ClosedAdmission() const {
   return earliest;
 }
 
-Instant::Steady EndpointSet::EarliestAdmission() const {
+Instant::Steady EndpointSet::EarliestAdmission() const noexcept {
   Instant::Steady earliest = Instant::Steady::max();
   for (const Member& member : members_) {
     earliest = std::min(earliest, member.circuit.RetryAt());
@@ -101,13 +122,14 @@ Instant::Steady EndpointSet::EarliestAdmission() const {
 std::string EndpointSet::WhyLeftOut(Index index, Instant::Steady now) const {
   const Member& member = members_[index];
   if (member.circuit.State() == CircuitState::kHalfOpen) {
-    return "left out while another call probes it; it failed before: " + member.lastReason;
+    return "left out while another call probes it; it failed before: " +
+           member.lastReason.ToString();
   }
   return "left out for another " + std::to_string(Until(member.circuit.RetryAt(), now).count()) +
-         " ms; it failed before: " + member.lastReason;
+         " ms; it failed before: " + member.lastReason.ToString();
 }
 
-bool EndpointSet::SetClockOffset(Index index, milliseconds offset) {
+bool EndpointSet::SetClockOffset(Index index, milliseconds offset) noexcept {
   Member& member = members_[index];
   member.clockOffset = offset;
   const bool isWrong = offset > kLargestOffset || offset < -kLargestOffset;
@@ -115,18 +137,14 @@ bool EndpointSet::SetClockOffset(Index index, milliseconds offset) {
 }
 
 EndpointSet::Change EndpointSet::ChangeSince(CircuitState before, Index index,
-                                             Instant::Steady now) const {
+                                             Instant::Steady now) const noexcept {
   const Circuit& circuit = members_[index].circuit;
   if (circuit.State() == before) {
     return boost::none;
   }
-  CircuitRecord record;
-  record.endpoint = Url(index);
-  record.state = circuit.State();
-  if (record.state == CircuitState::kOpen && now != Instant::Steady()) {
-    record.retryAfter = Until(circuit.RetryAt(), now);
-  }
-  return record;
+  const bool isTimed = circuit.State() == CircuitState::kOpen && now != Instant::Steady();
+  return NewState{index, circuit.State(),
+                  isTimed ? Until(circuit.RetryAt(), now) : milliseconds(0)};
 }
 
 }  // namespace SsoClient::Access

@@ -4,6 +4,7 @@
 #include <chrono>
 #include <cstddef>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -11,18 +12,25 @@
 
 #include "attempt.h"
 #include "circuit.h"
+#include "failure.h"
 
 namespace SsoClient::Access {
 
-/// The endpoints of a source, each with its circuit. The preferred one is asked first: the one that
-/// answered last, at first the first. Not thread-safe.
+/// The endpoints of a source, each with its circuit, and with places for the attempts that may be
+/// under way at once. The preferred one is asked first: the one that answered last, at first the
+/// first. Not thread-safe.
 class EndpointSet {
  public:
   using Index = std::size_t;
   /// Whether a request has asked each endpoint in its current round.
   using Asked = std::vector<bool>;
+  struct NewState {
+    Index endpoint;
+    CircuitState state;
+    std::chrono::milliseconds retryAfter;  ///< for an open circuit, until the next probe
+  };
   /// The new state of a circuit; not set when it has not changed.
-  using Change = boost::optional<CircuitRecord>;
+  using Change = boost::optional<NewState>;
 
   EndpointSet(const RetryConfig& config, std::vector<std::unique_ptr<EndpointClient>> clients);
 
@@ -30,52 +38,56 @@ class EndpointSet {
   EndpointClient& Client(Index index) const { return *members_[index].client; }
   const std::string& Url(Index index) const { return Client(index).Where().url; }
 
-  /// True when an endpoint that is not in `asked` may be asked.
-  bool CanAdmit(const Asked& asked, Instant::Steady now) const;
-  bool CanAdmit(Index index, Instant::Steady now) const {
+  /// True when an endpoint that is not in `asked` may be asked, with or without a free place.
+  bool CanAdmit(const Asked& asked, Instant::Steady now) const noexcept;
+  bool CanAdmit(Index index, Instant::Steady now) const noexcept {
     return members_[index].circuit.CanAdmit(now);
   }
-  struct Admission {
-    boost::optional<Index> endpoint;  ///< not set when none may be asked
-    Change change;
-  };
-  /// The next endpoint that is not in `asked`. Its outcome must be reported.
-  Admission Admit(const Asked& asked, Instant::Steady now);
+  /// True when an endpoint that may be asked has a free place.
+  bool HasPlace(Instant::Steady now) const noexcept;
+  /// Takes a place at the next endpoint that is not in `asked`, may be asked and has one. Not set
+  /// when there is none.
+  std::optional<Index> TakePlace(const Asked& asked, Instant::Steady now) noexcept;
+  void ReturnPlace(Index index) noexcept { --members_[index].underWay; }
 
-  /// The endpoint has answered, and is preferred now. `change` closes the circuit.
-  Change OnAnswer(Index index);
-  Change OnFailure(Index index, const std::string& reason, std::chrono::milliseconds retryAfter,
-                   Instant::Steady now, double draw);
+  /// An attempt begins at an endpoint that may be asked. Its outcome must be reported.
+  Change Begin(Index index, Instant::Steady now) noexcept;
+  /// The endpoint has answered, and is preferred now. The change closes the circuit.
+  Change OnAnswer(Index index) noexcept;
+  Change OnFailure(Index index, const Reason& reason, std::chrono::milliseconds retryAfter,
+                   Instant::Steady now, double draw) noexcept;
   /// The attempt ended before the endpoint did anything. If the callers' deadlines had passed
   /// before, another endpoint is preferred.
-  Change OnAbandoned(Index index, bool hasWaitedInVain);
+  Change OnAbandoned(Index index, bool hasWaitedInVain) noexcept;
 
   /// When an endpoint with a closed circuit may be asked; not set when all circuits are open.
-  boost::optional<Instant::Steady> ClosedAdmission() const;
+  boost::optional<Instant::Steady> ClosedAdmission() const noexcept;
   /// When any endpoint may be asked.
-  Instant::Steady EarliestAdmission() const;
+  Instant::Steady EarliestAdmission() const noexcept;
   /// Why an endpoint is left out, with its last failure.
   std::string WhyLeftOut(Index index, Instant::Steady now) const;
 
   /// The offset of the endpoint's clock that was seen last; zero before.
   std::chrono::milliseconds ClockOffset(Index index) const { return members_[index].clockOffset; }
   /// Notes an offset; true when the clock began or ceased to be wrong.
-  bool SetClockOffset(Index index, std::chrono::milliseconds offset);
+  bool SetClockOffset(Index index, std::chrono::milliseconds offset) noexcept;
 
  private:
   struct Member {
     std::unique_ptr<EndpointClient> client;
     Circuit circuit;
-    std::string lastReason;
+    std::size_t underWay = 0;
+    Reason lastReason;
     std::chrono::milliseconds clockOffset{0};
     bool isClockWrong = false;
   };
 
   // The endpoints in the order in which they are asked.
-  Index Nth(std::size_t n) const;
-  Change ChangeSince(CircuitState before, Index index, Instant::Steady now) const;
+  Index Nth(std::size_t n) const noexcept;
+  Change ChangeSince(CircuitState before, Index index, Instant::Steady now) const noexcept;
 
   std::vector<Member> members_;
+  const std::size_t places_;  ///< of each endpoint
   Index preferred_ = 0;
 };
 

@@ -4,6 +4,8 @@
 
 #include <ssoclient/exceptions.h>
 
+#include "secret_text.h"
+
 namespace SsoClient::Access {
 
 namespace {
@@ -19,6 +21,11 @@ std::shared_ptr<const Tarnik::Exception> SharedOutOfMemory() noexcept {
   return {std::shared_ptr<void>(), &Tarnik::OutOfMemory()};
 }
 
+std::shared_ptr<const std::string> TextWithoutMemory() noexcept {
+  static const std::string kText = "no memory";
+  return {std::shared_ptr<void>(), &kText};
+}
+
 std::string TextOf(const std::exception_ptr& foreign) {
   try {
     std::rethrow_exception(foreign);
@@ -29,37 +36,67 @@ std::string TextOf(const std::exception_ptr& foreign) {
   }
 }
 
-bool IsBadAlloc(const std::exception_ptr& foreign) noexcept {
+// What a callback receives for an exception that is not kept as a copy.
+std::shared_ptr<const Tarnik::Exception> Convert(const std::exception_ptr& foreign) {
   try {
     std::rethrow_exception(foreign);
   } catch (const std::bad_alloc&) {
-    return true;
+    return SharedOutOfMemory();
+  } catch (const Tarnik::Exception& known) {
+    return CopyOf(known);
   } catch (...) {
-    return false;
+    return std::make_shared<const SsoException>(TextOf(foreign));
   }
 }
 
 }  // namespace
 
-Failure::Failure(const std::exception_ptr& exception) {
+std::string Reason::ToString() const {
+  return std::string(NameOf(kind)) + ": " + *text;
+}
+
+Reason MakeReason(FailureKind kind, const std::string& text) noexcept {
   try {
-    std::rethrow_exception(exception);
-  } catch (const Tarnik::Exception& known) {
-    exception_ = CopyOf(known);
-  } catch (...) {
-    foreign_ = exception;
+    return {kind, std::make_shared<const std::string>(text)};
+  } catch (const std::bad_alloc&) {
+    return {kind, TextWithoutMemory()};
   }
 }
 
-Failure Failure::Copy(const Tarnik::Exception& exception) {
-  Failure failure;
-  failure.exception_ = CopyOf(exception);
-  return failure;
+Failure::Failure(const std::exception_ptr& exception) noexcept : foreign_(exception) {
+  reason_.kind = FailureKind::kLocal;
+  try {
+    std::rethrow_exception(exception);
+  } catch (const Tarnik::Exception& known) {
+    reason_.kind = Classify(known);
+    try {
+      exception_ = CopyOf(known);
+      foreign_ = nullptr;
+    } catch (const std::bad_alloc&) {
+      // The object itself is kept.
+    }
+  } catch (...) {
+    // The object itself is kept.
+  }
+}
+
+Failure::Failure(const std::exception_ptr& exception, Reason reason) noexcept : Failure(exception) {
+  reason_ = std::move(reason);
+}
+
+Failure Failure::Copy(const Tarnik::Exception& exception) noexcept {
+  return Made([&exception] {
+    Failure failure;
+    failure.exception_ = CopyOf(exception);
+    failure.reason_.kind = Classify(exception);
+    return failure;
+  });
 }
 
 Failure Failure::OutOfMemory() noexcept {
   Failure failure;
   failure.exception_ = SharedOutOfMemory();
+  failure.reason_.kind = FailureKind::kLocal;
   return failure;
 }
 
@@ -75,21 +112,26 @@ std::shared_ptr<const Tarnik::Exception> Failure::ForCallback() const noexcept {
     return exception_;
   }
   try {
-    if (!IsBadAlloc(foreign_)) {
-      return std::make_shared<const SsoException>(TextOf(foreign_));
-    }
+    return Convert(foreign_);
   } catch (...) {
-    // Reported as below.
+    return SharedOutOfMemory();
   }
-  return SharedOutOfMemory();
 }
 
 std::string Failure::Message() const {
   return exception_ != nullptr ? exception_->Message() : TextOf(foreign_);
 }
 
-FailureKind Failure::Kind() const noexcept {
-  return exception_ != nullptr ? Classify(*exception_) : FailureKind::kLocal;
+Reason Failure::AsReason() const noexcept {
+  try {
+    return reason_.IsSet() ? reason_ : MakeReason(reason_.kind, RecordText());
+  } catch (const std::bad_alloc&) {
+    return {reason_.kind, TextWithoutMemory()};
+  }
+}
+
+std::string Failure::RecordText() const {
+  return reason_.IsSet() ? *reason_.text : ToRecordText(Message());
 }
 
 }  // namespace SsoClient::Access

@@ -1,18 +1,36 @@
 #include "refresh_schedule.h"
 
+#include <utility>
+
 namespace SsoClient::Access {
 
 RefreshSchedule::Item& RefreshSchedule::Set(const KeyPtr& key, Instant::Steady at) {
-  const auto found = items_.try_emplace(key).first;
-  // The pointer that is in both containers.
-  const KeyPtr& known = found->first;
-  byTime_.insert({at, known});
-  Item& item = found->second;
-  if (item.at != at) {
-    byTime_.erase({item.at, known});
-    item.at = at;
+  const auto found = items_.find(key);
+  if (found == items_.end()) {
+    return Add(key, at);
   }
-  return item;
+  // The pointer that is in both containers.
+  Move(found->first, found->second, at);
+  return found->second;
+}
+
+RefreshSchedule::Item& RefreshSchedule::Add(const KeyPtr& key, Instant::Steady at) {
+  const auto inserted = byTime_.insert({at, key}).first;
+  try {
+    Item& item = items_[key];
+    item.at = at;
+    return item;
+  } catch (...) {
+    byTime_.erase(inserted);
+    throw;
+  }
+}
+
+void RefreshSchedule::Move(const KeyPtr& key, Item& item, Instant::Steady at) noexcept {
+  auto node = byTime_.extract({item.at, key});
+  node.value().first = at;
+  byTime_.insert(std::move(node));
+  item.at = at;
 }
 
 void RefreshSchedule::Remove(const KeyPtr& key) {
@@ -50,18 +68,6 @@ std::vector<KeyPtr> RefreshSchedule::Due(Instant::Steady now, std::size_t limit)
     due.push_back(key);
   }
   return due;
-}
-
-std::vector<KeyPtr> RefreshSchedule::EndOutage() {
-  std::vector<KeyPtr> keys;
-  for (auto& [key, item] : items_) {
-    if (item.failures > 0 && item.isOutage) {
-      item.failures = 0;
-      item.isOutage = false;
-      keys.push_back(key);
-    }
-  }
-  return keys;
 }
 
 }  // namespace SsoClient::Access

@@ -25,7 +25,7 @@ class RefreshSchedule {
   };
 
   /// Adds the key if it is not there, and moves it to `at`. The reference is valid until the key is
-  /// removed.
+  /// removed. Only to add a key needs memory; without it, nothing changes.
   Item& Set(const KeyPtr& key, Instant::Steady at);
   void Remove(const KeyPtr& key);
   void Clear();
@@ -35,10 +35,23 @@ class RefreshSchedule {
   boost::optional<Instant::Steady> Earliest() const;
   /// The keys whose time has come, at most `limit`, the earliest first.
   std::vector<KeyPtr> Due(Instant::Steady now, std::size_t limit) const;
-  /// The keys with failures in an outage, which is over: their failures count no longer.
-  std::vector<KeyPtr> EndOutage();
+  /// Visits the keys with failures in an outage, which is over: their failures count no longer.
+  /// `visit` may move its key.
+  template <class Visit>
+  void EndOutage(const Visit& visit) {
+    for (auto& [key, item] : items_) {
+      if (item.failures > 0 && item.isOutage) {
+        item.failures = 0;
+        item.isOutage = false;
+        visit(key, item);
+      }
+    }
+  }
 
  private:
+  Item& Add(const KeyPtr& key, Instant::Steady at);
+  void Move(const KeyPtr& key, Item& item, Instant::Steady at) noexcept;
+
   struct Earlier {
     bool operator()(const std::pair<Instant::Steady, KeyPtr>& a,
                     const std::pair<Instant::Steady, KeyPtr>& b) const noexcept {

@@ -42,23 +42,28 @@ void Core::KeepFresh() {
 
 // The timer has fired.
 void Core::RunDue() noexcept {
+  Section section(*this);
+  timer_ = nullptr;
+  timerAt_ = Instant::Steady::max();
+  if (state_ != State::kRunning) {
+    return;
+  }
+  const Instant now = runtime_->Now();
   try {
-    Section section(*this);
-    timer_ = nullptr;
-    timerAt_ = Instant::Steady::max();
-    if (state_ != State::kRunning) {
-      return;
-    }
-    const Instant now = runtime_->Now();
-    for (const KeyPtr& key : schedule_.Due(now.steady, config_->cache.capacity * 2)) {
-      if (backgroundRequests_ == kMaxBackgroundRequests) {
-        break;
-      }
-      LookAt(section, key, now);
-    }
+    LookAtDue(section, now);
     ArmTimer(section);
-  } catch (...) {
-    // No memory. The next call that stores a token arms the timer again.
+  } catch (const std::exception&) {
+    // No memory. What is left is due a little later.
+    ArmTimer(section, now.steady + kNextLook);
+  }
+}
+
+void Core::LookAtDue(Section& section, const Instant& now) {
+  for (const KeyPtr& key : schedule_.Due(now.steady, config_->cache.capacity * 2)) {
+    if (backgroundRequests_ == kMaxBackgroundRequests) {
+      break;
+    }
+    LookAt(section, key, now);
   }
 }
 
@@ -82,17 +87,20 @@ void Core::LookAt(Section& section, const KeyPtr& key, const Instant& now) {
     schedule_.Set(key, entry->Life().end.steady);
     return;
   }
-  // The end of the request sets another time.
-  schedule_.Set(key, entry != nullptr ? std::max(entry->Life().end.steady, now.steady + kNextLook)
-                                      : now.steady + config_->retry.longestDelay + kNextLook);
   RefreshInBackground(section, key);
+  // The end of the request sets another time, unless there is no memory for a timer then.
+  Instant::Steady next = now.steady + config_->retry.longestDelay + kNextLook;
+  if (entry != nullptr) {
+    next = std::min(next, std::max(entry->Life().end.steady, now.steady + kNextLook));
+  }
+  schedule_.Set(key, next);
 }
 
 void Core::RefreshInBackground(Section& section, const KeyPtr& key) {
   const auto request = std::make_shared<Request>(key, true, endpoints_.Size());
-  section.Start(request);
   requests_.emplace(key, request);
   ++backgroundRequests_;
+  section.Start(request);
 }
 
 EntryPtr Core::Store(Section& section, const KeyPtr& key,
@@ -100,89 +108,96 @@ EntryPtr Core::Store(Section& section, const KeyPtr& key,
                      const Instant& now) {
   section.Keep(cache_.Peek(SpecView(*key)));
   auto entry = std::make_shared<CacheEntry>(key, token, life, now);
+  // First, since a time for a token that is not in the cache does no harm.
+  RefreshSchedule::Item& item = schedule_.Set(key, life.refreshAt);
   const EntryPtr evicted =
       cache_.Insert(entry, [this](const KeyPtr& other) { return IsPinned(other); });
+  item.failures = 0;
+  item.isOutage = false;
   if (evicted != nullptr) {
     section.Keep(evicted);
     counters_.evictions.Add();
     schedule_.Remove(evicted->Key());
   }
-  RefreshSchedule::Item& item = schedule_.Set(key, life.refreshAt);
-  item.failures = 0;
-  item.isOutage = false;
   ArmTimer(section);
   return entry;
 }
 
 void Core::ScheduleAfterFailure(Section& section, const Request& request, const Failure& failure,
-                                FailureKind kind, const Instant& now) {
+                                const Instant& now) noexcept {
   RefreshSchedule::Item* item = schedule_.Find(request.key);
   if (item == nullptr || !request.isBackground) {
     return;
   }
   counters_.refreshFailures.Add();
   ++item->failures;
-  item->isOutage = AllowsFailover(kind);
+  item->isOutage = AllowsFailover(failure.Kind());
   Instant::Steady next =
       now.steady + Backoff(config_->retry, item->failures, milliseconds(0), runtime_->Draw());
   if (item->isOutage) {
     next = std::max(next, endpoints_.EarliestAdmission());
   }
-  RefreshFailureRecord record;
   const EntryPtr entry = cache_.Peek(SpecView(*request.key));
   if (entry != nullptr) {
     next = std::min(next, std::max(entry->Life().end.steady, now.steady));
-    record.usableUntil = ToDateTime(entry->Life().usableUntil.wall);
   }
   schedule_.Set(request.key, next);
   ArmTimer(section);
-  record.source = config_->name;
-  record.failure = kind;
-  record.message = failure.Message();
-  record.nextAttempt = std::chrono::ceil<milliseconds>(next - now.steady);
-  section.ToListener([record](AccessListener& listener) { listener.OnRefreshFailed(record); });
+  section.ToListener([&] {
+    RefreshFailureRecord record;
+    record.source = config_->name;
+    record.failure = failure.Kind();
+    record.message = failure.RecordText();
+    if (entry != nullptr) {
+      record.usableUntil = ToDateTime(entry->Life().usableUntil.wall);
+    }
+    record.nextAttempt = std::chrono::ceil<milliseconds>(next - now.steady);
+    return Section::Report(
+        [record](AccessListener& listener) { listener.OnRefreshFailed(record); });
+  });
 }
 
 // An endpoint answers again. What waits for that goes on, spread a little.
-void Core::EndOutage(Section& section, const Instant& now) {
+void Core::EndOutage(Section& section, const Instant& now) noexcept {
   for (const auto& [key, request] : requests_) {
     if (request->pause != nullptr) {
       section.Cancel(std::exchange(request->pause, nullptr));
       section.Start(request);
     }
   }
-  for (const KeyPtr& key : schedule_.EndOutage()) {
+  schedule_.EndOutage([&](const KeyPtr& key, const RefreshSchedule::Item& item) {
     const auto spread = std::chrono::duration_cast<milliseconds>(
         runtime_->Draw() * std::chrono::duration<double, std::milli>(config_->retry.firstDelay));
-    const RefreshSchedule::Item* item = schedule_.Find(key);
-    schedule_.Set(key, std::min(item->at, now.steady + spread));
-  }
+    schedule_.Set(key, std::min(item.at, now.steady + spread));
+  });
   ArmTimer(section);
 }
 
-void Core::ArmTimer(Section& section) {
-  const auto earliest = schedule_.Earliest();
+// The timer fires when the first key is due, but not before `earliest`.
+void Core::ArmTimer(Section& section, Instant::Steady earliest) noexcept {
+  const auto first = schedule_.Earliest();
   // The end of a background request arms the timer.
-  if (!earliest || state_ != State::kRunning || backgroundRequests_ >= kMaxBackgroundRequests) {
+  if (!first || state_ != State::kRunning || backgroundRequests_ >= kMaxBackgroundRequests) {
     return;
   }
-  if (timer_ != nullptr && timerAt_ <= *earliest) {
+  const Instant::Steady at = std::max(*first, earliest);
+  if (timer_ != nullptr && timerAt_ <= at) {
     return;
   }
-  section.Cancel(std::exchange(timer_, nullptr));
-  timerAt_ = *earliest;
   try {
-    timer_ = runtime_->RunAt(timerAt_, [core = weak_from_this()] {
+    auto timer = runtime_->RunAt(at, [core = weak_from_this()] {
       if (const auto self = core.lock()) {
         self->RunDue();
       }
     });
+    section.Cancel(std::exchange(timer_, std::move(timer)));
+    timerAt_ = at;
   } catch (...) {
-    // No timer now. The next change of the schedule tries again.
+    // The timer stays as it is. The next change of the schedule, or the next request, tries again.
   }
 }
 
-bool Core::IsPinned(const KeyPtr& key) {
+bool Core::IsPinned(const KeyPtr& key) noexcept {
   const RefreshSchedule::Item* item = schedule_.Find(key);
   return item != nullptr && item->isPinned;
 }

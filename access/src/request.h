@@ -3,7 +3,6 @@
 
 #include <memory>
 #include <optional>
-#include <string>
 #include <unordered_set>
 #include <vector>
 
@@ -14,6 +13,8 @@
 #include "endpoint_set.h"
 #include "failure.h"
 #include "login_gate.h"
+#include "stage.h"
+#include "turn_queue.h"
 #include "waiter.h"
 
 namespace SsoClient::Access {
@@ -27,8 +28,9 @@ struct Request {
   /// Goes on although nobody waits.
   const bool isBackground;
   std::unordered_set<WaiterPtr> waiters;
-  /// What it is doing, for the message of a deadline: "... was waiting for" this.
-  std::string stage = "a worker thread";
+  /// What it is doing, for the message of a deadline, and the endpoint of the last attempt.
+  Stage stage = Stage::kWorker;
+  EndpointSet::Index endpoint = 0;
   /// It has ended, or nobody waits for it: the thread that works for it drops what it has.
   bool hasEnded = false;
   /// The callers that waited for it have left at their deadlines.
@@ -43,13 +45,20 @@ struct Request {
   /// Ends the request for `base`.
   CancellationSource cancellation;
 
+  /// Its place in the queues for the attempts and for the login's function.
+  TurnQueue::Ticket turn;
+  TurnQueue::Ticket turnOfFunction;
+  /// A place at an endpoint that is kept for it until its next attempt begins.
+  std::optional<EndpointSet::Index> place;
+  /// The same for the login's function.
+  bool hasPlaceOfFunction = false;
+
   int attempts = 0;
   int undecided = 0;  ///< attempts that no service has decided
   int rounds = 1;
   EndpointSet::Asked asked;
-  std::vector<std::string> reasons;  ///< the last failure of each endpoint in this request
+  std::vector<Reason> reasons;  ///< the last failure of each endpoint in this request
   Failure lastFailure;
-  FailureKind lastKind = FailureKind::kNone;
   /// The limit of the attempt under way; null between attempts.
   Tarnik::Ref<Tarnik::Http::CallLimit> limit;
   /// The pause before the next round; null otherwise.
@@ -57,6 +66,10 @@ struct Request {
   std::chrono::milliseconds retryAfter{0};
   /// The next one in the list of a section that is about to run this one.
   std::shared_ptr<Request> nextStarted;
+  /// The same for one that has ended, and what is then cancelled.
+  std::shared_ptr<Request> nextEnded;
+  Tarnik::Ref<Tarnik::Http::CallLimit> endedLimit;
+  Tarnik::Ref<Tarnik::System::CancellableItem> endedPause;
 };
 
 }  // namespace SsoClient::Access

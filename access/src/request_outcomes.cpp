@@ -41,40 +41,55 @@ GrantedPeriod PeriodOf(const SamlToken& token, milliseconds clockOffset) {
           std::chrono::microseconds(token.ExpirationTime().GetUtcTime()), clockOffset};
 }
 
-std::string Reason(const AttemptOutcome& outcome) {
-  return std::string(NameOf(outcome.kind)) + ": " + outcome.message;
-}
-
 // An exception of the class of `last` for several endpoints.
 Failure Combine(const Failure& last, const std::string& text) {
-  const bool isOther = last.IsSet() && last.Kind() != FailureKind::kUnreachable;
+  const bool isOther = last.IsSet() && !last.Is<CommunicationException>();
   return isOther ? Failure::Of(SsoException(text)) : Failure::Of(CommunicationException(text));
 }
 
 }  // namespace
 
 // Returns whether another attempt follows at once.
-bool Core::Conclude(const RequestPtr& request, Step& step, AttemptOutcome outcome) {
+bool Core::Conclude(const RequestPtr& request, Step& step, Result result) {
   Section section(*this);
   const Instant now = runtime_->Now();
   request->limit = nullptr;
-  if (request->hasEnded && AllowsFailover(outcome.kind)) {
-    outcome.kind = FailureKind::kAbandoned;
+  if (request->hasEnded && AllowsFailover(result.outcome.kind)) {
+    result.outcome.kind = FailureKind::kAbandoned;
   }
-  NoteOutcome(section, request, step, outcome, now);
-  if (outcome.token != nullptr) {
-    Accept(section, request, step, outcome, now);
+  NoteOutcome(section, request, step, result, now);
+  if (result.outcome.token != nullptr) {
+    Accept(section, request, step, result.outcome, now);
     return false;
   }
   if (request->hasEnded) {
     return false;
   }
-  return AllowsFailover(outcome.kind) ? GoOnAfterFailure(section, request, step, outcome, now)
-                                      : GoOnAfterDecision(section, request, step, outcome, now);
+  return AllowsFailover(result.outcome.kind)
+             ? GoOnAfterFailure(section, request, step, result, now)
+             : GoOnAfterDecision(section, request, step, result, now);
 }
 
-void Core::NoteOutcome(Section& section, const RequestPtr& request, const Step& step,
-                       const AttemptOutcome& outcome, const Instant& now) {
+void Core::NoteOutcome(Section& section, const RequestPtr& request, Step& step, Result& result,
+                       const Instant& now) noexcept {
+  AttemptOutcome& outcome = result.outcome;
+  NoteCircuit(section, request, step, result, now);
+  LeaveGate(section, request, VerdictOf(outcome.kind), result.refusal, now);
+  NoteClock(section, step, outcome);
+  counters_.CountAttempt(outcome.kind);
+  step.record.duration =
+      std::chrono::duration_cast<std::chrono::microseconds>(now.steady - step.begun);
+  step.record.failure = outcome.kind;
+  step.record.message = std::move(outcome.message);
+  step.record.httpStatus = outcome.httpStatus;
+  section.ReportEnd(step.record);
+}
+
+// The worker is free, and so is the place at the endpoint.
+void Core::NoteCircuit(Section& section, const RequestPtr& request, const Step& step,
+                       const Result& result, const Instant& now) noexcept {
+  const AttemptOutcome& outcome = result.outcome;
+  endpoints_.ReturnPlace(step.endpoint);
   if (IsAnswer(outcome.kind)) {
     const EndpointSet::Change change = endpoints_.OnAnswer(step.endpoint);
     section.Circuit(change);
@@ -82,21 +97,13 @@ void Core::NoteOutcome(Section& section, const RequestPtr& request, const Step& 
       EndOutage(section, now);
     }
   } else if (AllowsFailover(outcome.kind)) {
-    section.Circuit(endpoints_.OnFailure(step.endpoint, Reason(outcome), outcome.retryAfter,
+    section.Circuit(endpoints_.OnFailure(step.endpoint, result.reason, outcome.retryAfter,
                                          now.steady, runtime_->Draw()));
+    WakeHopeless(section, now);
   } else {
     section.Circuit(endpoints_.OnAbandoned(step.endpoint, request->hasWaitedInVain));
   }
-  const Failure refusal = IsRefusal(outcome.kind) ? Failure(outcome.failure) : Failure();
-  LeaveGate(section, request, VerdictOf(outcome.kind), refusal, now);
-  NoteClock(section, step, outcome);
-  counters_.CountAttempt(outcome.kind);
-  AttemptRecord record = step.record;
-  record.duration = std::chrono::duration_cast<std::chrono::microseconds>(now.steady - step.begun);
-  record.failure = outcome.kind;
-  record.message = outcome.message;
-  record.httpStatus = outcome.httpStatus;
-  section.ToListener([record](AccessListener& listener) { listener.OnAttemptEnded(record); });
+  ServeTurns(section, now);
 }
 
 LoginVerdict Core::VerdictOf(FailureKind kind) const noexcept {
@@ -106,12 +113,14 @@ LoginVerdict Core::VerdictOf(FailureKind kind) const noexcept {
   return IsRefusal(kind) ? LoginVerdict::kRefused : LoginVerdict::kUndecided;
 }
 
-void Core::NoteClock(Section& section, const Step& step, const AttemptOutcome& outcome) {
+void Core::NoteClock(Section& section, const Step& step, const AttemptOutcome& outcome) noexcept {
   if (!outcome.clockOffset || !endpoints_.SetClockOffset(step.endpoint, *outcome.clockOffset)) {
     return;
   }
-  const ClockRecord record{config_->name, endpoints_.Url(step.endpoint), *outcome.clockOffset};
-  section.ToListener([record](AccessListener& listener) { listener.OnClock(record); });
+  section.ToListener([&] {
+    const ClockRecord record{config_->name, endpoints_.Url(step.endpoint), *outcome.clockOffset};
+    return Section::Report([record](AccessListener& listener) { listener.OnClock(record); });
+  });
 }
 
 void Core::Accept(Section& section, const RequestPtr& request, const Step& step,
@@ -120,19 +129,15 @@ void Core::Accept(Section& section, const RequestPtr& request, const Step& step,
   if (state_ != State::kRunning) {
     return;
   }
-  for (DeviationRecord deviation : outcome.deviations) {
-    counters_.deviations.Add();
-    deviation.source = config_->name;
-    deviation.endpoint = endpoints_.Url(step.endpoint);
-    section.ToListener([deviation](AccessListener& listener) { listener.OnDeviation(deviation); });
-  }
+  ReportDeviations(section, step, outcome);
   const TokenLife life = PlanTokenLife(
       config_->refresh, PeriodOf(*outcome.token, endpoints_.ClockOffset(step.endpoint)), now,
       runtime_->Draw());
   if (life.granted <= std::chrono::microseconds(0)) {
     if (!request->hasEnded) {
-      const SsoException ended("The service issued a token that has ended already.");
-      Fail(section, request, Failure::Copy(ended), FailureKind::kBadToken, now);
+      const Failure ended =
+          Failure::Of(SsoException("The service issued a token that has ended already."));
+      Fail(section, request, ended.WithKind(FailureKind::kBadToken), now);
     }
     return;
   }
@@ -144,13 +149,25 @@ void Core::Accept(Section& section, const RequestPtr& request, const Step& step,
   }
 }
 
+void Core::ReportDeviations(Section& section, const Step& step,
+                            const AttemptOutcome& outcome) noexcept {
+  for (const DeviationRecord& deviation : outcome.deviations) {
+    counters_.deviations.Add();
+    section.ToListener([&] {
+      DeviationRecord record = deviation;
+      record.source = config_->name;
+      record.endpoint = endpoints_.Url(step.endpoint);
+      return Section::Report([record](AccessListener& listener) { listener.OnDeviation(record); });
+    });
+  }
+}
+
 bool Core::GoOnAfterFailure(Section& section, const RequestPtr& request, const Step& step,
-                            const AttemptOutcome& outcome, const Instant& now) {
+                            const Result& result, const Instant& now) noexcept {
   request->asked[step.endpoint] = true;
-  request->reasons[step.endpoint] = Reason(outcome);
-  request->lastFailure = Failure(outcome.failure);
-  request->lastKind = outcome.kind;
-  request->retryAfter = outcome.retryAfter;
+  request->reasons[step.endpoint] = result.reason;
+  request->lastFailure = result.failure;
+  request->retryAfter = result.outcome.retryAfter;
   if (++request->undecided < AttemptLimit(*request) &&
       endpoints_.CanAdmit(request->asked, now.steady)) {
     return true;
@@ -159,36 +176,43 @@ bool Core::GoOnAfterFailure(Section& section, const RequestPtr& request, const S
   return false;
 }
 
-bool Core::GoOnAfterDecision(Section& section, const RequestPtr& request, const Step& step,
-                             const AttemptOutcome& outcome, const Instant& now) {
+bool Core::GoOnAfterDecision(Section& section, const RequestPtr& request, Step& step,
+                             const Result& result, const Instant& now) noexcept {
   if (step.operation == AttemptOperation::kRenewal) {
     request->mayRenew = false;
     return true;
   }
-  if (step.operation == AttemptOperation::kExchange && IsRefusal(outcome.kind)) {
-    const auto& source = std::get<TokenLogin>(config_->login).source;
-    section.Do([source, base = step.base] { source->Invalidate(*base); });
+  if (step.operation == AttemptOperation::kExchange && IsRefusal(result.outcome.kind)) {
+    step.isBaseRefused = true;
     if (!std::exchange(request->hasReplacedBase, true)) {
       request->base = nullptr;
       return true;
     }
-    std::erase_if(refusedExchanges_,
-                  [&now](const auto& item) { return now.steady >= item.second.until; });
-    refusedExchanges_[request->key] = {Failure(outcome.failure),
-                                       now.steady + config_->retry.refusalMemory};
+    RememberRefusedExchange(request->key, result.failure, now);
   }
-  Fail(section, request, Failure(outcome.failure), outcome.kind, now);
+  Fail(section, request, result.failure, now);
   return false;
 }
 
+// Without memory, it is asked for once more.
+void Core::RememberRefusedExchange(const KeyPtr& key, const Failure& failure,
+                                   const Instant& now) noexcept {
+  std::erase_if(refusedExchanges_,
+                [&now](const auto& item) { return now.steady >= item.second.until; });
+  try {
+    refusedExchanges_[key] = {failure, now.steady + config_->retry.refusalMemory};
+  } catch (const std::bad_alloc&) {
+  }
+}
+
 // A refresh that nobody waits for asks each endpoint once, and is repeated later.
-int Core::AttemptLimit(const Request& request) const {
+int Core::AttemptLimit(const Request& request) const noexcept {
   const int attempts = config_->retry.attempts;
   return request.waiters.empty() ? std::min(attempts, static_cast<int>(endpoints_.Size()))
                                  : attempts;
 }
 
-void Core::EndRound(Section& section, const RequestPtr& request, const Instant& now) {
+void Core::EndRound(Section& section, const RequestPtr& request, const Instant& now) noexcept {
   const bool hasAsked =
       std::find(request->asked.begin(), request->asked.end(), true) != request->asked.end();
   const auto admission = endpoints_.ClosedAdmission();
@@ -201,7 +225,7 @@ void Core::EndRound(Section& section, const RequestPtr& request, const Instant& 
   Pause(section, request, std::max(now.steady + pause, *admission));
 }
 
-void Core::Pause(Section& section, const RequestPtr& request, Instant::Steady until) {
+void Core::Pause(Section& section, const RequestPtr& request, Instant::Steady until) noexcept {
   try {
     request->pause =
         runtime_->RunAt(until, [core = weak_from_this(), weak = std::weak_ptr(request)] {
@@ -212,13 +236,13 @@ void Core::Pause(Section& section, const RequestPtr& request, Instant::Steady un
           }
         });
   } catch (...) {
-    Fail(section, request, Failure::Current(), FailureKind::kLocal, runtime_->Now());
+    Fail(section, request, Failure::Current(), runtime_->Now());
     return;
   }
   ++request->rounds;
-  request->asked.assign(endpoints_.Size(), false);
+  std::fill(request->asked.begin(), request->asked.end(), false);
   request->base = nullptr;
-  request->stage = "the next attempt";
+  request->stage = Stage::kPause;
 }
 
 void Core::Resume(const RequestPtr& request) noexcept {
@@ -228,34 +252,37 @@ void Core::Resume(const RequestPtr& request) noexcept {
   }
 }
 
-void Core::FailUndecided(Section& section, const RequestPtr& request, const Instant& now) {
-  const FailureKind kind =
-      request->lastFailure.IsSet() ? request->lastKind : FailureKind::kUnreachable;
-  if (endpoints_.Size() == 1 && request->lastFailure.IsSet()) {
-    Fail(section, request, request->lastFailure, kind, now);
-    return;
-  }
+void Core::FailUndecided(Section& section, const RequestPtr& request, const Instant& now) noexcept {
+  const bool isOnly = endpoints_.Size() == 1 && request->lastFailure.IsSet();
+  const Failure failure =
+      isOnly ? request->lastFailure : Failure::Made([&] { return SummaryOf(*request, now); });
+  Fail(section, request, failure, now);
+}
+
+// All that is known about the endpoints.
+Failure Core::SummaryOf(const Request& request, const Instant& now) const {
   std::string text = "No endpoint has given a token.";
   for (EndpointSet::Index index = 0; index < endpoints_.Size(); ++index) {
-    const std::string& reason = request->reasons[index];
+    const Reason& reason = request.reasons[index];
     const bool isLeftOut = !endpoints_.CanAdmit(index, now.steady);
-    if (!reason.empty() || isLeftOut) {
+    if (reason.IsSet() || isLeftOut) {
       text += " " + endpoints_.Url(index) + ": " +
-              (reason.empty() ? endpoints_.WhyLeftOut(index, now.steady) : reason);
+              (reason.IsSet() ? reason.ToString() : endpoints_.WhyLeftOut(index, now.steady));
     }
   }
-  Fail(section, request, Combine(request->lastFailure, text), kind, now);
+  const Failure& last = request.lastFailure;
+  return Combine(last, text).WithKind(last.IsSet() ? last.Kind() : FailureKind::kUnreachable);
 }
 
 void Core::Fail(Section& section, const RequestPtr& request, const Failure& failure,
-                FailureKind kind, const Instant& now) {
+                const Instant& now) noexcept {
   GiveAll(section, request, failure);
   Detach(section, request);
-  ScheduleAfterFailure(section, *request, failure, kind, now);
+  ScheduleAfterFailure(section, *request, failure, now);
 }
 
 // The request ends, or is left to its thread. Nobody waits for it any more.
-void Core::Detach(Section& section, const RequestPtr& request) {
+void Core::Detach(Section& section, const RequestPtr& request) noexcept {
   if (std::exchange(request->hasEnded, true)) {
     return;
   }
@@ -263,16 +290,12 @@ void Core::Detach(Section& section, const RequestPtr& request) {
   if (found != requests_.end() && found->second == request) {
     requests_.erase(found);
   }
+  ReturnPlaces(section, request);
   // An attempt under way has the gate until it has ended.
   if (request->limit == nullptr) {
-    section.Start(gate_.Withdraw(request));
-    request->gate.reset();
+    WithdrawFromGate(section, request);
   }
-  section.Cancel(request->limit);
-  section.Cancel(std::exchange(request->pause, nullptr));
-  if (std::holds_alternative<TokenLogin>(config_->login)) {
-    section.Do([request] { request->cancellation.Cancel(); });
-  }
+  section.End(request);
   if (request->isBackground) {
     --backgroundRequests_;
     ArmTimer(section);

@@ -6,6 +6,7 @@
 #include <ssoclient/exceptions.h>
 
 #include "core.h"
+#include "secret_text.h"
 #include "section.h"
 #include "step.h"
 
@@ -39,6 +40,18 @@ void Normalise(AttemptOutcome& outcome) {
   outcome.kind = FailureKind::kBadToken;
 }
 
+// `failure` with another text.
+Failure Reworded(const Failure& failure, const std::string& text) {
+  if (failure.Is<InvalidCredentialsException>()) {
+    return Failure::Of(InvalidCredentialsException(text));
+  }
+  if (failure.Is<PasswordExpiredException>()) {
+    return Failure::Of(PasswordExpiredException(text));
+  }
+  return failure.Is<CommunicationException>() ? Failure::Of(CommunicationException(text))
+                                              : Failure::Of(SsoException(text));
+}
+
 }  // namespace
 
 // Throws when there is no worker.
@@ -57,7 +70,7 @@ void Core::StartWork(const RequestPtr& request) noexcept {
 void Core::FailHere(const RequestPtr& request, const Failure& failure) noexcept {
   Section section(*this);
   if (!request->hasEnded) {
-    Fail(section, request, failure, FailureKind::kLocal, runtime_->Now());
+    Fail(section, request, failure, runtime_->Now());
   }
 }
 
@@ -102,11 +115,10 @@ bool Core::Begin(const RequestPtr& request, Step& step) {
   if (std::holds_alternative<TokenLogin>(config_->login)) {
     step.operation = AttemptOperation::kExchange;
     step.base = request->base;
-    request->stage = "the token to exchange";
+    request->stage = Stage::kBase;
     return true;
   }
-  request->stage = "the login's function";
-  return true;
+  return !std::holds_alternative<PasswordLogin>(config_->login) || EnterFunction(request);
 }
 
 bool Core::IsRenewable(const SamlToken& token) const {
@@ -132,18 +144,20 @@ void Core::RequestBase(const RequestPtr& request) {
 }
 
 void Core::ReceiveBase(const RequestPtr& request, const std::shared_ptr<const SamlToken>& token,
-                       const Tarnik::Exception* failure) {
+                       const Tarnik::Exception* failure) noexcept {
   Section section(*this);
   if (request->hasEnded) {
     return;
   }
   if (failure != nullptr) {
-    Fail(section, request, Failure::Copy(*failure), Classify(*failure), runtime_->Now());
+    Fail(section, request, Failure::Copy(*failure), runtime_->Now());
     return;
   }
   if (token == nullptr) {
-    const SsoException empty("The source of the token to exchange has returned none.");
-    Fail(section, request, Failure::Copy(empty), FailureKind::kLocal, runtime_->Now());
+    const Failure empty = Failure::Made([] {
+      return Failure::Of(SsoException("The source of the token to exchange has returned none."));
+    });
+    Fail(section, request, empty.WithKind(FailureKind::kLocal), runtime_->Now());
     return;
   }
   request->base = token;
@@ -153,15 +167,18 @@ void Core::ReceiveBase(const RequestPtr& request, const std::shared_ptr<const Sa
 bool Core::RunLogin(const RequestPtr& request, Step& step) {
   Failure failure;
   const Secret secret = FetchSecret(std::get<PasswordLogin>(config_->login), failure);
+  {
+    Section section(*this);
+    ReturnFunction(section);
+  }
   if (!failure.IsSet() && secret.text.empty()) {
-    failure = Failure::Of(
-        Tarnik::InvalidArgumentException("The login's function has returned an empty password."));
+    failure = Failure::Made([] {
+      return Failure::Of(
+          Tarnik::InvalidArgumentException("The login's function has returned an empty password."));
+    });
   }
   if (failure.IsSet()) {
-    Section section(*this);
-    if (!request->hasEnded) {
-      Fail(section, request, failure, FailureKind::kSecretFailed, runtime_->Now());
-    }
+    FailHere(request, failure.WithKind(FailureKind::kSecretFailed));
     return false;
   }
   step.tag = tagger_.TagOf(secret.text);
@@ -175,11 +192,16 @@ bool Core::RunAttempt(const RequestPtr& request, Step& step, const std::string& 
   if (config_->listener != nullptr) {
     config_->listener->OnAttemptBegun(step.record);
   }
-  return Conclude(request, step, Perform(step, *request, secret));
+  const bool goesOn = Conclude(request, step, Perform(step, *request, secret));
+  if (step.isBaseRefused) {
+    InvalidateBase(step);
+  }
+  return goesOn;
 }
 
-AttemptOutcome Core::Perform(const Step& step, const Request& request, const std::string& secret) {
-  AttemptOutcome outcome;
+Result Core::Perform(const Step& step, const Request& request, const std::string& secret) noexcept {
+  Result result;
+  AttemptOutcome& outcome = result.outcome;
   try {
     outcome = endpoints_.Client(step.endpoint)
                   .Attempt({step.operation, request.key->spec, step.base, secret}, *step.limit);
@@ -188,37 +210,69 @@ AttemptOutcome Core::Perform(const Step& step, const Request& request, const std
     outcome = {};
     outcome.failure = std::current_exception();
     outcome.kind = FailureKind::kLocal;
-    outcome.message = Failure(outcome.failure).Message();
+    const Failure failure(outcome.failure);
+    result.reason = failure.AsReason();
+    result.failure = Failure(outcome.failure, result.reason);
+    return result;
   }
-  return outcome;
+  if (outcome.failure != nullptr) {
+    result.reason = MakeReason(outcome.kind, outcome.message);
+    result.failure = Failure(outcome.failure, result.reason);
+    result.refusal = ToRemember(result.failure, secret);
+  }
+  return result;
+}
+
+// A refusal outlives the call that it was the answer to, so it must not contain the password.
+Failure Core::ToRemember(const Failure& failure, const std::string& secret) const noexcept {
+  const FailureKind kind = failure.Kind();
+  if (kind != FailureKind::kRefusedLogin && kind != FailureKind::kExpiredPassword) {
+    return {};
+  }
+  try {
+    const std::string text = failure.Message();
+    const std::string shown = HideSecret(text, secret);
+    return shown == text ? failure : Reworded(failure, shown).WithKind(kind);
+  } catch (const std::bad_alloc&) {
+    return kind == FailureKind::kRefusedLogin ? refused_ : expired_;
+  }
+}
+
+// Without memory, the next refusal does it.
+void Core::InvalidateBase(const Step& step) noexcept {
+  try {
+    std::get<TokenLogin>(config_->login).source->Invalidate(*step.base);
+  } catch (const std::exception&) {
+  }
 }
 
 // False when the request has ended or has to wait.
 bool Core::Admit(const RequestPtr& request, Step& step) {
   Section section(*this);
   const Instant now = runtime_->Now();
-  if (request->hasEnded || !MayLogIn(section, request, step, now)) {
+  if (request->hasEnded || !MayLogIn(section, request, step, now) ||
+      !TakePlace(section, request, now)) {
     return false;
   }
-  const EndpointSet::Admission admission = endpoints_.Admit(request->asked, now.steady);
-  section.Circuit(admission.change);
-  if (!admission.endpoint) {
-    LeaveGate(section, request, LoginVerdict::kUndecided, {}, now);
-    EndRound(section, request, now);
-    return false;
-  }
-  step.endpoint = *admission.endpoint;
+  step.endpoint = *request->place;
   step.begun = now.steady;
   step.limit = Tarnik::Http::CreateCallLimit(now.steady + config_->retry.attemptTimeout);
-  request->limit = step.limit;
-  request->stage = "the answer of " + endpoints_.Url(step.endpoint);
-  const EntryPtr entry = cache_.Peek(SpecView(*request->key));
   step.record.source = config_->name;
-  step.record.id = ++lastAttemptId_;
   step.record.endpoint = endpoints_.Url(step.endpoint);
   step.record.operation = step.operation;
+  const EntryPtr entry = cache_.Peek(SpecView(*request->key));
   step.record.isRefresh = request->isBackground && entry != nullptr &&
                           entry->Life().IsUsable(now, std::chrono::seconds(0));
+  // From here on nothing fails, and what has begun here is ended by `Conclude`.
+  request->place.reset();
+  section.Circuit(endpoints_.Begin(step.endpoint, now.steady));
+  if (request->gate) {
+    gate_.Begin(*request->gate);
+  }
+  request->limit = step.limit;
+  request->stage = Stage::kAttempt;
+  request->endpoint = step.endpoint;
+  step.record.id = ++lastAttemptId_;
   step.record.number = ++request->attempts;
   return true;
 }
@@ -227,13 +281,12 @@ bool Core::MayLogIn(Section& section, const RequestPtr& request, const Step& ste
                     const Instant& now) {
   const bool isLogin = step.operation == AttemptOperation::kLogin;
   if (request->gate && (!isLogin || *request->gate != step.tag)) {
-    section.Start(gate_.Withdraw(request));
-    request->gate.reset();
+    WithdrawFromGate(section, request);
   }
   const Failure refusal = RememberedRefusal(request, step, now);
   if (refusal.IsSet()) {
     counters_.refusedFromMemory.Add(std::max<std::size_t>(request->waiters.size(), 1));
-    Fail(section, request, refusal, refusal.Kind(), now);
+    Fail(section, request, refusal, now);
     return false;
   }
   if (!isLogin) {
@@ -242,7 +295,9 @@ bool Core::MayLogIn(Section& section, const RequestPtr& request, const Step& ste
   const bool mayLogIn = gate_.Enter(step.tag, request, now.steady);
   request->gate = step.tag;
   if (!mayLogIn) {
-    request->stage = "the login of another call";
+    request->stage = Stage::kGate;
+    // The one that has the gate may need it.
+    ReturnPlace(section, request);
   }
   return mayLogIn;
 }
@@ -263,9 +318,17 @@ Failure Core::RememberedRefusal(const RequestPtr& request, const Step& step, con
 }
 
 void Core::LeaveGate(Section& section, const RequestPtr& request, LoginVerdict verdict,
-                     const Failure& refusal, const Instant& now) {
+                     const Failure& refusal, const Instant& now) noexcept {
   if (request->gate) {
-    section.Start(gate_.Leave(*request->gate, request, verdict, refusal, now.steady));
+    gate_.Leave(*request->gate, request, verdict, refusal, now.steady,
+                [&section](const RequestPtr& next) { section.Start(next); });
+    request->gate.reset();
+  }
+}
+
+void Core::WithdrawFromGate(Section& section, const RequestPtr& request) noexcept {
+  if (request->gate) {
+    gate_.Withdraw(request, [&section](const RequestPtr& next) { section.Start(next); });
     request->gate.reset();
   }
 }

@@ -13,7 +13,8 @@
 namespace SsoClient::Access {
 
 /// Holds the lock of a core. What is to happen outside of the lock is noted here, and happens when
-/// the section ends: first the answers, since callers wait for them.
+/// the section ends: first the answers, since callers wait for them. What must not be lost needs no
+/// memory: answers, ends and starts of requests, and the record of an attempt.
 class Section {
  public:
   using Report = std::function<void(AccessListener&)>;
@@ -23,28 +24,30 @@ class Section {
   Section(const Section&) = delete;
   Section& operator=(const Section&) = delete;
 
+  /// The waiter's timer is cancelled as well.
   void GiveAnswer(const WaiterPtr& waiter, Answer answer) noexcept;
   void Start(const RequestPtr& request) noexcept;
-  void Start(const std::vector<RequestPtr>& requests) noexcept {
-    for (const RequestPtr& request : requests) {
-      Start(request);
-    }
-  }
+  /// Cancels what is under way for a request that has ended.
+  void End(const RequestPtr& request) noexcept;
+  /// Without memory, the item is not cancelled, and fires in its time.
   void Cancel(Tarnik::Ref<Tarnik::System::CancellableItem> item) noexcept {
     AddUnlessNull(items_, std::move(item));
   }
-  void Cancel(Tarnik::Ref<Tarnik::Http::CallLimit> limit) noexcept {
-    AddUnlessNull(limits_, std::move(limit));
-  }
-  /// Called outside of the lock.
-  void Do(std::function<void()> action) noexcept { AddUnlessNull(actions_, std::move(action)); }
-  /// `report` is called if there is a listener.
-  void ToListener(Report report) noexcept {
-    if (core_.config_->listener != nullptr) {
-      AddUnlessNull(reports_, std::move(report));
+  /// The attempt has ended. The record must live longer than the section.
+  void ReportEnd(const AttemptRecord& record) noexcept { ended_ = &record; }
+  /// The result of `make` is called if there is a listener. Without memory, it is not.
+  template <class Make>
+  void ToListener(const Make& make) noexcept {
+    if (core_.config_->listener == nullptr) {
+      return;
+    }
+    try {
+      reports_.push_back(make());
+    } catch (const std::bad_alloc&) {
+      // Nothing that a caller needs.
     }
   }
-  void Circuit(const EndpointSet::Change& change);
+  void Circuit(const EndpointSet::Change& change) noexcept;
   /// Destroyed outside of the lock.
   void Keep(std::shared_ptr<const void> object) noexcept {
     AddUnlessNull(kept_, std::move(object));
@@ -53,8 +56,6 @@ class Section {
   void Finish() noexcept;
 
  private:
-  // Without memory, nothing is added: what is not cancelled ends by itself, later. Answers and
-  // starts, which must not be lost, need none.
   template <class Element>
   static void AddUnlessNull(std::vector<Element>& elements, Element element) noexcept {
     if (!element) {
@@ -63,8 +64,14 @@ class Section {
     try {
       elements.push_back(std::move(element));
     } catch (const std::bad_alloc&) {
+      // What is not cancelled ends by itself, later.
     }
   }
+
+  void AnswerAll() noexcept;
+  void CancelEnded() noexcept;
+  void RunStarted() noexcept;
+  void ReportAll() noexcept;
 
   Core& core_;
   std::vector<std::shared_ptr<const void>> kept_;
@@ -72,10 +79,11 @@ class Section {
   Waiter* lastAnswered_ = nullptr;
   RequestPtr firstStarted_;
   Request* lastStarted_ = nullptr;
+  RequestPtr firstEnded_;
+  Request* lastEnded_ = nullptr;
   std::vector<Tarnik::Ref<Tarnik::System::CancellableItem>> items_;
-  std::vector<Tarnik::Ref<Tarnik::Http::CallLimit>> limits_;
+  const AttemptRecord* ended_ = nullptr;
   std::vector<Report> reports_;
-  std::vector<std::function<void()>> actions_;
   std::unique_lock<std::mutex> lock_;
 };
 

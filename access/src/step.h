@@ -6,7 +6,9 @@
 #include <ssoclient/access/listener.h>
 #include <tarnik/http/bounded_user_agent.h>
 
+#include "attempt.h"
 #include "endpoint_set.h"
+#include "failure.h"
 #include "instant.h"
 #include "secret.h"
 
@@ -22,6 +24,17 @@ struct Step {
   Tarnik::Ref<Tarnik::Http::CallLimit> limit;
   AttemptRecord record;
   Instant::Steady begun;
+  /// The service has refused `base`, which its source must replace.
+  bool isBaseRefused = false;
+};
+
+/// What came of an attempt. Moving and copying the failures needs no memory.
+struct Result {
+  AttemptOutcome outcome;
+  Reason reason;
+  Failure failure;  ///< not set for a token
+  /// A refusal of the login as it is remembered, without the password; not set otherwise.
+  Failure refusal;
 };
 
 }  // namespace SsoClient::Access

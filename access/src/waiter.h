@@ -33,6 +33,8 @@ class Waiter {
 
   /// What it waits for; null before and after. Under the lock of the core, as is the timer.
   std::shared_ptr<Request> request;
+  /// Whether another caller, or the source, has begun the request.
+  bool hasJoined = false;
   Tarnik::Ref<Tarnik::System::CancellableItem> deadlineTimer;
   /// The answer that a section is about to give, and the next one in its list.
   Answer dueAnswer;

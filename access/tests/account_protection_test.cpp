@@ -47,6 +47,23 @@ TEST_F(AccountProtectionTest, WrongPasswordIsSentOnceWhateverTheNumberOfCallersA
   EXPECT_EQ(source->Metrics().refusedFromMemory, 1990U);
 }
 
+TEST_F(AccountProtectionTest, WrongPasswordIsSentOnceWhateverTheNumberOfEndpointsAndAttempts) {
+  config.endpoints.push_back({"https://c.example.com/sts", ""});
+  config.retry.attempts = 10;
+  config.keepFresh = {SpecFor("kept")};
+  Know("right", Refused());
+  // The first endpoint does not answer; the second one has decided.
+  scripts[0]->Set(Fails(Unreachable()));
+  Make();
+  for (int i = 0; i < 100; ++i) {
+    EXPECT_TRUE(Get(SpecFor(AudienceNumber(i))).Is<InvalidCredentialsException>());
+    runtime->Advance(seconds(1));
+  }
+  EXPECT_EQ(scripts[1]->Count(), 1U);
+  EXPECT_EQ(scripts[2]->Count(), 0U);
+  EXPECT_EQ(scripts[0]->Count(), 1U);
+}
+
 TEST_F(AccountProtectionTest, ExpiredPasswordIsSentOnce) {
   Know("right", Expired());
   Make();

@@ -26,28 +26,31 @@ TEST(BackoffTest, GrowsByPowersOfTwoToTheLimit) {
   }
 }
 
-TEST(BackoffTest, IsRandomFromZero) {
-  EXPECT_EQ(Backoff(Config(), 5, milliseconds(0), 0.0), milliseconds(0));
-  EXPECT_EQ(Backoff(Config(), 5, milliseconds(0), 0.5), seconds(4));
+TEST(BackoffTest, IsRandomInItsUpperHalf) {
+  EXPECT_EQ(Backoff(Config(), 5, milliseconds(0), 0.0), seconds(4));
+  EXPECT_EQ(Backoff(Config(), 5, milliseconds(0), 0.5), seconds(6));
+  RetryConfig config = Config();
+  config.firstDelay = milliseconds(1);
+  EXPECT_EQ(Backoff(config, 1, milliseconds(0), 0.0), milliseconds(1));
 }
 
 TEST(BackoffTest, ManyFailuresDoNotOverflow) {
-  EXPECT_EQ(Backoff(Config(), 1000000000, milliseconds(0), 0.5), seconds(30));
+  EXPECT_EQ(Backoff(Config(), 1000000000, milliseconds(0), 0.5), seconds(45));
   RetryConfig config = Config();
   config.firstDelay = milliseconds(0);
   EXPECT_EQ(Backoff(config, 10, milliseconds(0), 0.9), milliseconds(0));
   config.firstDelay = minutes(2);
-  EXPECT_EQ(Backoff(config, 1, milliseconds(0), 0.5), seconds(30));
+  EXPECT_EQ(Backoff(config, 1, milliseconds(0), 0.5), seconds(45));
 }
 
 TEST(BackoffTest, RetryAfterIsTheLeast) {
-  EXPECT_EQ(Backoff(Config(), 1, seconds(10), 0.0), seconds(10));
-  EXPECT_EQ(Backoff(Config(), 1, seconds(10), 0.5), seconds(10) + milliseconds(250));
+  EXPECT_EQ(Backoff(Config(), 1, seconds(10), 0.0), seconds(10) + milliseconds(250));
+  EXPECT_EQ(Backoff(Config(), 1, seconds(10), 0.5), seconds(10) + milliseconds(375));
 }
 
 TEST(BackoffTest, RetryAfterIsLimited) {
-  EXPECT_EQ(Backoff(Config(), 1, minutes(60), 0.0), minutes(5));
-  EXPECT_EQ(Backoff(Config(), 1, minutes(-60), 0.0), milliseconds(0));
+  EXPECT_EQ(Backoff(Config(), 1, minutes(60), 0.0), minutes(5) + milliseconds(250));
+  EXPECT_EQ(Backoff(Config(), 1, minutes(-60), 0.0), milliseconds(250));
 }
 
 }  // namespace

@@ -22,7 +22,7 @@ class CircuitTest : public ::testing::Test {
   void FailTimes(int times) {
     for (int i = 0; i < times; ++i) {
       ASSERT_TRUE(circuit.Admit(now));
-      circuit.OnFailure(now, milliseconds(0), 0.5);
+      circuit.OnFailure(now, milliseconds(0), 0.0);
     }
   }
 
@@ -67,7 +67,7 @@ TEST_F(CircuitTest, ProbeThatFailsOpensItForLonger) {
   FailTimes(3);
   now += seconds(2);
   ASSERT_TRUE(circuit.Admit(now));
-  circuit.OnFailure(now, milliseconds(0), 0.5);
+  circuit.OnFailure(now, milliseconds(0), 0.0);
   EXPECT_EQ(circuit.State(), CircuitState::kOpen);
   EXPECT_EQ(circuit.RetryAt(), now + seconds(4));
 }
@@ -94,7 +94,7 @@ TEST_F(CircuitTest, AttemptsFromBeforeItOpenedDoNotPutOffTheProbe) {
     ASSERT_TRUE(circuit.Admit(now));
   }
   for (int i = 0; i < 50; ++i) {
-    circuit.OnFailure(now, milliseconds(0), 0.5);
+    circuit.OnFailure(now, milliseconds(0), 0.0);
   }
   EXPECT_EQ(circuit.RetryAt(), now + seconds(2));
 }
@@ -102,8 +102,8 @@ TEST_F(CircuitTest, AttemptsFromBeforeItOpenedDoNotPutOffTheProbe) {
 TEST_F(CircuitTest, RetryAfterHoldsAClosedCircuit) {
   circuit.OnFailure(now, seconds(10), 0.0);
   EXPECT_EQ(circuit.State(), CircuitState::kClosed);
-  EXPECT_FALSE(circuit.Admit(now + milliseconds(9999)));
-  EXPECT_TRUE(circuit.Admit(now + seconds(10)));
+  EXPECT_FALSE(circuit.Admit(now + milliseconds(10499)));
+  EXPECT_TRUE(circuit.Admit(now + milliseconds(10500)));
 }
 
 }  // namespace

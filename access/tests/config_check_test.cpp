@@ -61,6 +61,8 @@ std::vector<BadConfig> BadConfigs() {
       {"The longest margin of a token is negative.",
        [](auto& config) { config.refresh.longestMargin = seconds(-1); }},
       {"The number of attempts is not positive.", [](auto& config) { config.retry.attempts = 0; }},
+      {"The number of attempts at once is not positive.",
+       [](auto& config) { config.retry.attemptsAtOnce = 0; }},
       {limit, [](auto& config) { config.retry.attemptTimeout = milliseconds(0); }},
       {limit, [](auto& config) { config.retry.attemptTimeout = seconds(241); }},
       {delay, [](auto& config) { config.retry.firstDelay = milliseconds(-1); }},

@@ -54,6 +54,41 @@ TEST_F(CoreTest, TenThousandCallersOfOneKeyShareOneException) {
   EXPECT_NE(Get(spec).token, nullptr);
 }
 
+TEST_F(CoreTest, TenThousandCallersHaveTheirOwnDeadlinesAndCancellations) {
+  Make();
+  const CancellationSource cancellation;
+  scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
+    runtime->Pass(milliseconds(2500));
+    cancellation.Cancel();
+    runtime->Pass(milliseconds(2500));
+    EXPECT_FALSE(limit.IsCancelled());
+    return Issued(NewToken(hours(1)));
+  });
+  std::vector<std::shared_ptr<Reply>> replies;
+  for (int i = 0; i < 10000; ++i) {
+    CallContext context = Within(milliseconds(1000) * (1 + i % 10));
+    if (i % 3 == 0) {
+      context.cancellation = cancellation.Token();
+    }
+    replies.push_back(Ask(spec, context));
+  }
+  runtime->Settle();
+  EXPECT_EQ(Attempts(), 1U);
+  for (int i = 0; i < 10000; ++i) {
+    const Reply& reply = *replies[static_cast<std::size_t>(i)];
+    ASSERT_EQ(reply.calls, 1);
+    const int deadline = 1 + i % 10;
+    if (i % 3 == 0 && deadline > 2) {
+      ASSERT_TRUE(reply.Is<Tarnik::CancelledException>()) << i;
+    } else if (deadline <= 5) {
+      ASSERT_TRUE(reply.Is<CommunicationException>()) << i;
+    } else {
+      ASSERT_NE(reply.token, nullptr) << i;
+    }
+  }
+  EXPECT_EQ(runtime->TimersArmed(), 1U);  // that of the refresh
+}
+
 TEST_F(CoreTest, DifferentSpecsAreDifferentTokens) {
   Make();
   const Reply first = Get(spec);
@@ -81,7 +116,7 @@ TEST_F(CoreTest, CallerThatLeavesAtItsDeadlineDoesNotEndTheExchangeOfOthers) {
   ASSERT_TRUE(hasty->Has());
   EXPECT_TRUE(hasty->Is<CommunicationException>());
   EXPECT_EQ(hasty->Message(),
-            "The deadline passed while the call was waiting for the answer of "
+            "The deadline passed while the call was waiting for the attempt at "
             "https://a.example.com/sts.");
   ASSERT_TRUE(patient->Has());
   EXPECT_NE(patient->token, nullptr);

@@ -27,20 +27,26 @@ class EndpointSetTest : public ::testing::Test {
     RetryConfig config;
     config.failuresToOpen = 2;
     config.firstDelay = seconds(1);
+    config.attemptsAtOnce = 6;
     return config;
   }
   // The order in which the endpoints are asked in one round.
   std::vector<std::string> Order() {
     std::vector<std::string> order;
     EndpointSet::Asked asked(set.Size());
-    while (const auto index = set.Admit(asked, now).endpoint) {
+    while (const auto index = set.TakePlace(asked, now)) {
+      set.ReturnPlace(*index);
       asked[*index] = true;
       order.push_back(set.Url(*index));
     }
     return order;
   }
   EndpointSet::Change FailOnce(EndpointSet::Index index) {
-    return set.OnFailure(index, "unreachable: refused", milliseconds(0), now, 0.5);
+    return FailOnce(index, milliseconds(0));
+  }
+  EndpointSet::Change FailOnce(EndpointSet::Index index, milliseconds retryAfter) {
+    const Reason reason = MakeReason(FailureKind::kUnreachable, "refused");
+    return set.OnFailure(index, reason, retryAfter, now, 0.5);
   }
 
   EndpointSet set{Config(), Clients()};
@@ -63,22 +69,22 @@ TEST_F(EndpointSetTest, OpenCircuitsAreLeftOut) {
   const auto change = FailOnce(0);
   ASSERT_TRUE(change);
   EXPECT_EQ(change->state, CircuitState::kOpen);
-  EXPECT_EQ(change->retryAfter, seconds(1));
+  EXPECT_EQ(change->endpoint, 0U);
+  EXPECT_EQ(change->retryAfter, milliseconds(1500));
   EXPECT_EQ(Order(), (Urls{"https://b", "https://c"}));
   EXPECT_FALSE(set.CanAdmit(0, now));
   EXPECT_EQ(set.WhyLeftOut(0, now),
-            "left out for another 1000 ms; it failed before: unreachable: refused");
+            "left out for another 1500 ms; it failed before: unreachable: refused");
 }
 
 TEST_F(EndpointSetTest, ProbeChangesTheCircuit) {
   FailOnce(0);
   FailOnce(0);
-  now += seconds(1);
-  const auto admission = set.Admit(EndpointSet::Asked(3), now);
-  ASSERT_TRUE(admission.endpoint);
-  EXPECT_EQ(*admission.endpoint, 0U);
-  ASSERT_TRUE(admission.change);
-  EXPECT_EQ(admission.change->state, CircuitState::kHalfOpen);
+  now += milliseconds(1500);
+  EXPECT_EQ(set.TakePlace(EndpointSet::Asked(3), now), 0U);
+  const auto begun = set.Begin(0, now);
+  ASSERT_TRUE(begun);
+  EXPECT_EQ(begun->state, CircuitState::kHalfOpen);
   EXPECT_EQ(set.WhyLeftOut(0, now),
             "left out while another call probes it; it failed before: unreachable: refused");
   const auto closed = set.OnAnswer(0);
@@ -102,18 +108,50 @@ TEST_F(EndpointSetTest, AbandonedAfterTheDeadlinesOfAllPrefersTheNext) {
 TEST_F(EndpointSetTest, AdmissionsAreTheEarliest) {
   ASSERT_TRUE(set.ClosedAdmission());
   EXPECT_LE(*set.ClosedAdmission(), now);
-  set.OnFailure(0, "", seconds(10), now, 0.0);
-  set.OnFailure(1, "", seconds(20), now, 0.0);
-  set.OnFailure(2, "", seconds(30), now, 0.0);
-  EXPECT_EQ(*set.ClosedAdmission(), now + seconds(10));
+  FailOnce(0, seconds(10));
+  FailOnce(1, seconds(20));
+  FailOnce(2, seconds(30));
+  EXPECT_EQ(*set.ClosedAdmission(), now + milliseconds(10750));
   FailOnce(0);
-  EXPECT_EQ(*set.ClosedAdmission(), now + seconds(20));
-  EXPECT_EQ(set.EarliestAdmission(), now + seconds(1));
+  EXPECT_EQ(*set.ClosedAdmission(), now + milliseconds(20750));
+  EXPECT_EQ(set.EarliestAdmission(), now + milliseconds(1500));
   FailOnce(1);
   FailOnce(2);
   EXPECT_FALSE(set.ClosedAdmission());
   EXPECT_FALSE(set.CanAdmit(EndpointSet::Asked(3), now));
-  EXPECT_FALSE(set.Admit(EndpointSet::Asked(3), now).endpoint);
+  EXPECT_FALSE(set.TakePlace(EndpointSet::Asked(3), now));
+}
+
+TEST_F(EndpointSetTest, EachEndpointHasItsShareOfThePlaces) {
+  const EndpointSet::Asked none(3);
+  for (const EndpointSet::Index expected : {0U, 0U, 1U, 1U, 2U, 2U}) {
+    EXPECT_TRUE(set.HasPlace(now));
+    EXPECT_EQ(set.TakePlace(none, now), expected);
+  }
+  EXPECT_FALSE(set.HasPlace(now));
+  EXPECT_FALSE(set.TakePlace(none, now));
+  // It waits for a place only, and not for the circuit.
+  EXPECT_TRUE(set.CanAdmit(none, now));
+  set.ReturnPlace(1);
+  EXPECT_FALSE(set.TakePlace({false, true, false}, now));
+  EXPECT_EQ(set.TakePlace(none, now), 1U);
+}
+
+TEST_F(EndpointSetTest, PlaceOfAnEndpointThatIsLeftOutIsNotGiven) {
+  FailOnce(0);
+  FailOnce(0);
+  EXPECT_FALSE(set.TakePlace({false, true, true}, now));
+  EXPECT_EQ(set.TakePlace(EndpointSet::Asked(3), now), 1U);
+}
+
+TEST_F(EndpointSetTest, FewPlacesAreOneForEach) {
+  RetryConfig config = Config();
+  config.attemptsAtOnce = 1;
+  EndpointSet few(config, Clients());
+  for (const EndpointSet::Index expected : {0U, 1U, 2U}) {
+    EXPECT_EQ(few.TakePlace(EndpointSet::Asked(3), now), expected);
+  }
+  EXPECT_FALSE(few.HasPlace(now));
 }
 
 TEST_F(EndpointSetTest, ClockIsWrongBeyondThirtySeconds) {

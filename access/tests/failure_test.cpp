@@ -28,6 +28,31 @@ TEST(FailureTest, ExceptionsOfTheClientKeepClassAndMessage) {
   EXPECT_NE(dynamic_cast<const PasswordExpiredException*>(failure.ForCallback().get()), nullptr);
 }
 
+TEST(FailureTest, AttemptsDetermineKindAndText) {
+  const auto unauthorised =
+      std::make_exception_ptr(CommunicationException("Server returned error: 401 secret"));
+  const Failure failure(unauthorised, MakeReason(FailureKind::kRefusedLogin, "401 ***"));
+  EXPECT_EQ(failure.Kind(), FailureKind::kRefusedLogin);
+  EXPECT_EQ(failure.RecordText(), "401 ***");
+  EXPECT_EQ(failure.AsReason().ToString(), "refused-login: 401 ***");
+  // The exception is that of the client.
+  EXPECT_THROW(failure.Throw(), CommunicationException);
+  EXPECT_EQ(failure.Message(), "Server returned error: 401 secret");
+  EXPECT_TRUE(failure.Is<CommunicationException>());
+  EXPECT_TRUE(failure.Is<SsoException>());
+  EXPECT_FALSE(failure.Is<InvalidCredentialsException>());
+  const Failure copy = failure;
+  EXPECT_EQ(copy.Kind(), FailureKind::kRefusedLogin);
+  EXPECT_EQ(Failure(unauthorised).Kind(), FailureKind::kUnreachable);
+}
+
+TEST(FailureTest, TextForRecordsIsShortAndWithoutControlCharacters) {
+  const Failure failure = Of(SsoException(std::string("a\nb") + std::string(5000, 'c')));
+  EXPECT_EQ(failure.RecordText().size(), 1000U);
+  EXPECT_EQ(failure.RecordText().substr(0, 4), "a?bc");
+  EXPECT_EQ(failure.AsReason().kind, FailureKind::kFault);
+}
+
 TEST(FailureTest, EachCallerGetsACopy) {
   const Failure failure = Of(SsoException("shared"));
   const Tarnik::Exception* first = nullptr;

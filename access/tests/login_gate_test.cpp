@@ -22,8 +22,16 @@ RequestPtr MakeRequest() {
 class LoginGateTest : public ::testing::Test {
  protected:
   Turns Leave(const RequestPtr& request, LoginVerdict verdict) {
-    return gate.Leave(1, request, verdict, verdict == LoginVerdict::kRefused ? refusal : Failure(),
-                      now);
+    Turns turns;
+    gate.Begin(1);
+    gate.Leave(1, request, verdict, verdict == LoginVerdict::kRefused ? refusal : Failure(), now,
+               [&turns](const RequestPtr& next) { turns.push_back(next); });
+    return turns;
+  }
+  Turns Withdraw(const RequestPtr& request) {
+    Turns turns;
+    gate.Withdraw(request, [&turns](const RequestPtr& next) { turns.push_back(next); });
+    return turns;
   }
 
   LoginGate gate{minutes(5)};
@@ -110,9 +118,20 @@ TEST_F(LoginGateTest, WithdrawnRequestGetsNoTurn) {
   gate.Enter(1, a, now);
   gate.Enter(1, b, now);
   gate.Enter(1, c, now);
-  EXPECT_EQ(gate.Withdraw(b), Turns{});
-  EXPECT_EQ(gate.Withdraw(a), Turns{c});
-  EXPECT_EQ(gate.Withdraw(a), Turns{});
+  EXPECT_EQ(Withdraw(b), Turns{});
+  EXPECT_EQ(Withdraw(a), Turns{c});
+  EXPECT_EQ(Withdraw(a), Turns{});
+}
+
+TEST_F(LoginGateTest, RefusalOfALongLoginIsRememberedAlthoughTheSecretWasAcceptedLongBefore) {
+  gate.Enter(1, a, now);
+  Leave(a, LoginVerdict::kAccepted);
+  gate.Enter(1, a, now);
+  gate.Begin(1);
+  now += minutes(1);
+  gate.Enter(2, b, now);  // which forgets what is idle
+  gate.Leave(1, a, LoginVerdict::kRefused, refusal, now, [](const RequestPtr&) {});
+  EXPECT_TRUE(gate.RefusalOf(1, now).IsSet());
 }
 
 TEST_F(LoginGateTest, RequestsThatAreGoneAreNotKept) {
@@ -120,7 +139,7 @@ TEST_F(LoginGateTest, RequestsThatAreGoneAreNotKept) {
     const auto gone = MakeRequest();
     gate.Enter(1, a, now);
     gate.Enter(1, gone, now);
-    gate.Withdraw(gone);
+    Withdraw(gone);
     return gone;
   }();
   EXPECT_TRUE(weak.expired());

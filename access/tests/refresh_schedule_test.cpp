@@ -57,12 +57,19 @@ TEST(RefreshScheduleTest, EndOfAnOutageForgetsItsFailuresOnly) {
   outage.failures = 2;
   outage.isOutage = true;
   schedule.Set(KeyOf(3), At(3));
-  const auto keys = schedule.EndOutage();
+  std::vector<KeyPtr> keys;
+  const auto move = [&](const KeyPtr& key, const RefreshSchedule::Item&) {
+    keys.push_back(key);
+    schedule.Set(key, At(5));
+  };
+  schedule.EndOutage(move);
   ASSERT_EQ(keys.size(), 1U);
   EXPECT_EQ(keys[0]->spec.tokenLifetimeSec, 2);
+  EXPECT_EQ(schedule.Find(KeyOf(2))->at, At(5));
   EXPECT_EQ(schedule.Find(KeyOf(2))->failures, 0);
   EXPECT_EQ(schedule.Find(KeyOf(1))->failures, 3);
-  EXPECT_TRUE(schedule.EndOutage().empty());
+  schedule.EndOutage(move);
+  EXPECT_EQ(keys.size(), 1U);
 }
 
 TEST(RefreshScheduleTest, ClearRemovesAll) {

@@ -165,7 +165,7 @@ TEST_F(FailoverTest, CallWhileTheOnlyEndpointAsksToWaitFailsAtOnce) {
   const Reply reply = Get(spec);
   EXPECT_TRUE(reply.Is<CommunicationException>());
   EXPECT_EQ(reply.Message(),
-            "No endpoint has given a token. https://a.example.com/sts: left out for another 30000 "
+            "No endpoint has given a token. https://a.example.com/sts: left out for another 30250 "
             "ms; it failed before: http-status: HTTP status 503.");
   EXPECT_EQ(Attempts(), 1U);
 }
@@ -175,7 +175,7 @@ TEST_F(FailoverTest, CircuitOpensProbesAndCloses) {
   config.retry.attempts = 1;
   config.retry.failuresToOpen = 3;
   config.retry.firstDelay = seconds(1);
-  runtime->SetDraw([] { return 0.5; });
+  runtime->SetDraw([] { return 0.0; });
   ForAll(Fails(Unreachable()));
   Make();
   for (int i = 0; i < 3; ++i) {
@@ -275,11 +275,11 @@ TEST_F(FailoverTest, SuccessEndsThePausesOfOthers) {
   const auto pausing = Ask(spec);
   runtime->Settle();
   ASSERT_EQ(Attempts(), 1U);
-  // Another failure opens the circuit for one minute.
+  // Another failure opens the circuit for five and a half minutes.
   runtime->SetDraw([] { return 0.1; });
   EXPECT_TRUE(Get(SpecFor("https://other.example.com")).Is<CommunicationException>());
   ASSERT_EQ(Attempts(), 2U);
-  runtime->Advance(minutes(1));
+  runtime->Advance(seconds(330));
   ForAll(Issues(hours(1)));
   EXPECT_FALSE(pausing->Has());
   EXPECT_NE(Get(SpecFor("https://other.example.com")).token, nullptr);

@@ -1,13 +1,12 @@
 #include "attempts/attempt_failure.h"
 
 #include <algorithm>
-#include <cstddef>
 #include <string_view>
 
 #include <ssoclient/exceptions.h>
-#include <tarnik/text/display_text.h>
-#include <tarnik/text/string_util.h>
 #include <tarnik/xml/security/xml_security_exception.h>
+
+#include "secret_text.h"
 
 namespace SsoClient::Access {
 
@@ -19,7 +18,6 @@ constexpr std::string_view kFaultWithoutCode = "Invalid SOAP response: missing f
 
 constexpr int kUnauthorized = 401;
 constexpr int kInternalServerError = 500;
-constexpr std::size_t kMaxRecordedMessage = 1000;
 
 template <class Class>
 const Class* As(const Tarnik::Exception& failure) noexcept {
@@ -131,16 +129,6 @@ std::string MessageOf(const std::exception_ptr& exception) {
   }
 }
 
-// A service may repeat what it was sent.
-std::string ForRecords(std::string message, const std::string& secret) {
-  constexpr std::string_view kHidden = "***";
-  for (std::size_t at = message.find(secret); !secret.empty() && at != std::string::npos;
-       at = message.find(secret, at + kHidden.size())) {
-    message.replace(at, secret.size(), kHidden);
-  }
-  return Tarnik::ToDisplayText(message, kMaxRecordedMessage);
-}
-
 }  // namespace
 
 void SetFailure(AttemptOutcome& outcome, const std::exception_ptr& exception,
@@ -155,7 +143,8 @@ void SetFailure(AttemptOutcome& outcome, const std::exception_ptr& exception,
     outcome.kind = evidence.hasLoginFailed && !evidence.seen.hasSent ? FailureKind::kSecretFailed
                                                                      : FailureKind::kLocal;
   }
-  outcome.message = ForRecords(MessageOf(outcome.failure), evidence.secret);
+  // A service may repeat what it was sent.
+  outcome.message = ToRecordText(HideSecret(MessageOf(outcome.failure), evidence.secret));
 }
 
 }  // namespace SsoClient::Access

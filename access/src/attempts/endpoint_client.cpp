@@ -17,6 +17,7 @@
 #include "attempts/deviations.h"
 #include "attempts/exchange_observer.h"
 #include "attempts/part_observers.h"
+#include "secret_text.h"
 
 namespace SsoClient::Access {
 
@@ -86,6 +87,12 @@ class EndpointClientImpl final : public EndpointClient {
       const auto now = std::chrono::steady_clock::now();
       outcome.deviations = Compare(request, *outcome.token, attempting.seen,
                                    std::chrono::ceil<std::chrono::milliseconds>(now - begun));
+      for (DeviationRecord& deviation : outcome.deviations) {
+        // The other fields are not the service's own text.
+        if (deviation.field == "subject" || deviation.field == "audiences") {
+          deviation.issued = HideSecret(std::move(deviation.issued), request.secret);
+        }
+      }
     } catch (const std::bad_alloc&) {
       throw;
     } catch (...) {

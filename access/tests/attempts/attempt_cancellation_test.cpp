@@ -14,6 +14,7 @@ namespace {
 
 using namespace std::chrono_literals;
 using SsoClient::Testing::TenMinutes;
+using Tarnik::Http::ExchangeStage;
 using Clock = std::chrono::steady_clock;
 
 constexpr std::size_t kMoreThanSocketsBuffer = std::size_t{16} << 20;
@@ -24,6 +25,7 @@ struct Stage {
   bool isTls;
   bool isLarge;
   const char* awaited;
+  Tarnik::Http::ExchangeStage stage;
 };
 
 std::ostream& operator<<(std::ostream& stream, const Stage& stage) {
@@ -57,12 +59,18 @@ TEST_P(AttemptStageAsyncTest, CancellingEndsTheAttempt) {
   Clock::time_point cancelled;
   std::thread canceller([&] {
     EXPECT_TRUE(server_.WaitUntil([](const DevSts::Counters& seen) { return seen.stalled == 1; }));
+    // The service may be further than the client.
+    while (limit->Stage() != GetParam().stage) {
+      std::this_thread::yield();
+    }
     cancelled = Clock::now();
     limit->Cancel();
   });
+  EXPECT_EQ(limit->Stage(), ExchangeStage::kNone);
   const AttemptOutcome outcome = Attempt(*limit);
   const Clock::time_point ended = Clock::now();
   canceller.join();
+  EXPECT_EQ(limit->Stage(), ExchangeStage::kNone);
   ExpectFailure<CommunicationException>(outcome, FailureKind::kAbandoned);
   // Far from the minute that the attempt could take, also on a loaded machine.
   EXPECT_LT(ended - cancelled, 5s);
@@ -82,13 +90,18 @@ TEST_P(AttemptStageAsyncTest, TheEndOfItsTimeEndsTheAttempt) {
 
 INSTANTIATE_TEST_SUITE_P(
     Stages, AttemptStageAsyncTest,
-    testing::Values(
-        Stage{"Handshake", DevSts::Stall::BeforeTlsHandshake, true, false, "the TLS handshake."},
-        Stage{"Writing", DevSts::Stall::BeforeRequest, false, true, "the request to be sent."},
-        Stage{"WritingTls", DevSts::Stall::BeforeRequest, true, true, "the request to be sent."},
-        Stage{"Answer", DevSts::Stall::BeforeAnswer, false, false, "the answer."},
-        Stage{"Headers", DevSts::Stall::AfterHeaders, false, false, "the answer."},
-        Stage{"Body", DevSts::Stall::InMidBody, false, false, "the answer."}),
+    testing::Values(Stage{"Handshake", DevSts::Stall::BeforeTlsHandshake, true, false,
+                          "the TLS handshake.", ExchangeStage::kHandshake},
+                    Stage{"Writing", DevSts::Stall::BeforeRequest, false, true,
+                          "the request to be sent.", ExchangeStage::kSending},
+                    Stage{"WritingTls", DevSts::Stall::BeforeRequest, true, true,
+                          "the request to be sent.", ExchangeStage::kSending},
+                    Stage{"Answer", DevSts::Stall::BeforeAnswer, false, false, "the answer.",
+                          ExchangeStage::kAnswer},
+                    Stage{"Headers", DevSts::Stall::AfterHeaders, false, false, "the answer.",
+                          ExchangeStage::kRestOfAnswer},
+                    Stage{"Body", DevSts::Stall::InMidBody, false, false, "the answer.",
+                          ExchangeStage::kRestOfAnswer}),
     [](const auto& tested) { return tested.param.name; });
 
 TEST(AttemptDripTest, BytesThatArriveSlowlyDoNotExtendAnAttempt) {

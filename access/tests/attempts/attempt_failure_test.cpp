@@ -265,6 +265,31 @@ TEST_F(AttemptFailureTest, RecordsDoNotRepeatAPasswordThatTheServiceRepeats) {
             "Authentication failed: no user with '***',?'***'");
 }
 
+TEST_F(AttemptFailureTest, RecordsDoNotRepeatPasswordsOfAnySizeOrForm) {
+  for (const std::size_t size : {2U, 7U, 300U, 65536U}) {
+    std::string password;
+    while (password.size() < size) {
+      password += "&Q;7<\"#>'";
+    }
+    password.resize(size);
+    std::string escaped;
+    for (const char character : password) {
+      escaped += "&#" + std::to_string(static_cast<int>(character)) + ";";
+    }
+    for (const std::string& form : {password, escaped}) {
+      DevSts::FaultAnswer fault = Fault(kTrust, "FailedAuthentication");
+      fault.faultString = "no user with [" + form + "]";
+      AnswerWith(fault);
+      const AttemptOutcome outcome = AttemptHere(TenMinutes(), password);
+      EXPECT_EQ(outcome.message, "Authentication failed: no user with [***]") << size;
+    }
+    // The client cuts the reason of a status.
+    AnswerWith(DevSts::HttpAnswer{503, password, {}, ""});
+    const AttemptOutcome outcome = AttemptHere(TenMinutes(), password);
+    EXPECT_EQ(outcome.message.find(password.substr(0, 4)), std::string::npos) << outcome.message;
+  }
+}
+
 TEST_F(AttemptFailureTest, AnswersThatAreNotAsSpecified) {
   AnswerWith(DevSts::HttpAnswer{200, "OK", {}, "<html/>"});
   ExpectFailure<SsoException>(AttemptHere(), FailureKind::kBadAnswer);

@@ -72,8 +72,13 @@ void VirtualRuntime::Run(std::function<void()> work) {
 Tarnik::Ref<Tarnik::System::CancellableItem> VirtualRuntime::RunAt(Instant::Steady time,
                                                                    std::function<void()> action) {
   const auto key = timers_->Add(time, std::move(action));
-  return Tarnik::System::CreateCancellableItem(
-      [timers = timers_, key] { return timers->Remove(key); });
+  try {
+    return Tarnik::System::CreateCancellableItem(
+        [timers = timers_, key] { return timers->Remove(key); });
+  } catch (...) {
+    timers_->Remove(key);
+    throw;
+  }
 }
 
 bool VirtualRuntime::FireNext(Instant::Steady until) {

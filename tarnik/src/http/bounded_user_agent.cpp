@@ -16,6 +16,7 @@
 #include <tarnik/system/thread_pool.h>
 
 #include "core/copy_exception.h"
+#include "http/exchange_progress.h"
 #include "support/fork.h"
 #include "support/object_lock.h"
 #include "support/process_end.h"
@@ -102,6 +103,13 @@ class CallLimitImpl final : public CallLimit, public ObjectImpl {
   bool IsCancelled() const noexcept override { return isCancelled_; }
   std::string ToString() const override { return "<CallLimit>"; }
 
+  ExchangeStage Stage() const noexcept override {
+    const Ref<BoundedExchange> last = Last();
+    const Ref<PendingRequestItem> inner = last == nullptr ? nullptr : last->Inner();
+    auto* const progress = dynamic_cast<ExchangeProgress*>(inner.get());
+    return progress == nullptr ? ExchangeStage::kNone : progress->Stage();
+  }
+
   void Cancel() override {
     std::vector<Ref<BoundedExchange>> underWay;
     {
@@ -144,6 +152,11 @@ class CallLimitImpl final : public CallLimit, public ObjectImpl {
 
  private:
   ~CallLimitImpl() override = default;
+
+  Ref<BoundedExchange> Last() const noexcept {
+    const std::lock_guard lock(ObjectLock(this));
+    return underWay_.empty() ? nullptr : underWay_.back();
+  }
 
   const Clock::time_point deadline_;
   std::atomic<bool> isCancelled_{false};

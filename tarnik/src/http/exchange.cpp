@@ -11,7 +11,6 @@
 
 #include "core/copy_exception.h"
 #include "support/process_end.h"
-#include "system/connect_stage.h"
 #include "system/post_with.h"
 
 namespace Tarnik::Http {
@@ -33,19 +32,6 @@ std::string DurationText(unsigned long microseconds) {
     return std::to_string(microseconds / kPerMillisecond) + " milliseconds";
   }
   return std::to_string(microseconds) + " microseconds";
-}
-
-// What an exchange without a connection is waiting for.
-const char* DescribeConnect(const System::CancellableItem* connect) noexcept {
-  const auto* progress = dynamic_cast<const System::ConnectProgress*>(connect);
-  switch (progress == nullptr ? System::ConnectStage::kConnection : progress->Stage()) {
-    case System::ConnectStage::kLookUp:
-      return "the host look-up";
-    case System::ConnectStage::kConnection:
-      return "the connection";
-    default:
-      return "the TLS handshake";
-  }
 }
 
 // The failure that `make` returns, or `OutOfMemory()`.
@@ -199,8 +185,12 @@ void Exchange::OnWritten(const Exception* error) {
 
 void Exchange::OnRead(const Ref<Connection>& connection, std::string_view bytes,
                       const Exception* error) {
-  if (HasEnded()) {
-    return;
+  {
+    const std::lock_guard guard(mutex_);
+    if (hasEnded_) {
+      return;
+    }
+    hasAnswerBegun_ = hasAnswerBegun_ || !bytes.empty();
   }
   if (const auto failure = Parse(bytes, error)) {
     Fail(*failure);
@@ -273,11 +263,6 @@ void Exchange::TakeOverAnswer(const ClientResponseImpl& response, const PendingW
 void Exchange::SetFailure(const Exception& failure) noexcept {
   const std::lock_guard guard(mutex_);
   outcome_ = {CopyException(failure), nullptr};
-}
-
-bool Exchange::HasEnded() {
-  const std::lock_guard guard(mutex_);
-  return hasEnded_;
 }
 
 bool Exchange::Cancel() {
@@ -366,15 +351,25 @@ void Exchange::EndWithProcess() {
 
 TimeoutException Exchange::NoAnswer(unsigned long microseconds) {
   return TimeoutException("No answer from " + endpoint_.key + " within " +
-                          DurationText(microseconds) + ": waiting for " + DescribeStage() + ".");
+                          DurationText(microseconds) + ": waiting for " + Describe(Stage()) + ".");
 }
 
-const char* Exchange::DescribeStage() {
-  const std::lock_guard guard(mutex_);
-  if (work_.connection == nullptr) {
-    return DescribeConnect(work_.connect.get());
+ExchangeStage Exchange::Stage() noexcept {
+  // A thread of the parent may have held the lock.
+  if (mark_.IsFromParent()) {
+    return ExchangeStage::kNone;
   }
-  return isWritten_ ? "the answer" : "the request to be sent";
+  const std::lock_guard guard(mutex_);
+  if (hasEnded_) {
+    return ExchangeStage::kNone;
+  }
+  if (work_.connection == nullptr) {
+    return ConnectStageOf(work_.connect.get());
+  }
+  if (!isWritten_) {
+    return ExchangeStage::kSending;
+  }
+  return hasAnswerBegun_ ? ExchangeStage::kRestOfAnswer : ExchangeStage::kAnswer;
 }
 
 std::optional<Exchange::PendingWork> Exchange::Settle(Outcome outcome) {

@@ -12,6 +12,7 @@
 #include <tarnik/http/http_user_agent.h>
 
 #include "http/connection.h"
+#include "http/exchange_progress.h"
 #include "http/http_request_impl.h"
 #include "http/idle_connections.h"
 #include "http/origin.h"
@@ -26,7 +27,7 @@ namespace Tarnik::Http {
 ///
 /// The read starts together with the write, so that a close or an early answer is noticed
 /// immediately. The completions of operations under way keep alive what these operations use.
-class Exchange final : public PendingRequestItem, public ObjectImpl {
+class Exchange final : public PendingRequestItem, public ExchangeProgress, public ObjectImpl {
  public:
   /// What an exchange is made from.
   struct Parts {
@@ -47,6 +48,7 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   /// when it cannot begin to connect, and `std::bad_alloc`; the completion then never runs.
   void Start(unsigned long timeoutMicroseconds);
   bool Cancel() override;
+  ExchangeStage Stage() noexcept override;
   /// As `UserAgent::Wait`.
   Ref<ClientResponse> Wait(unsigned long timeoutMicroseconds);
 
@@ -79,7 +81,6 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
 
   void TakeOverAnswer(const ClientResponseImpl& response, const PendingWork& work, bool mayReuse);
 
-  bool HasEnded();
   /// Runs a step of the exchange on an I/O thread. What the step throws is the failure of the
   /// exchange.
   template <class Step>
@@ -94,7 +95,6 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   void SetFailure(const Exception& failure) noexcept;
   /// The failure after the time limit; says what the exchange is waiting for.
   TimeoutException NoAnswer(unsigned long microseconds);
-  const char* DescribeStage();
   /// Sets the outcome and returns the operations under way; nothing when there already is an
   /// outcome.
   std::optional<PendingWork> Settle(Outcome outcome);
@@ -118,6 +118,7 @@ class Exchange final : public PendingRequestItem, public ObjectImpl {
   bool hasConnectEnded_ = false;
   bool isDelivered_ = false;
   bool isWritten_ = false;
+  bool hasAnswerBegun_ = false;
   /// The answer is complete; its connection may be kept once the request has been written.
   bool isAnswerWaiting_ = false;
 

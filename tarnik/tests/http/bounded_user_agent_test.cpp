@@ -126,6 +126,27 @@ TEST_F(BoundedUserAgentAsyncTest, CancelEndsTheExchangesUnderWayAndRefusesLaterO
   EXPECT_TRUE(Eventually([&] { return record->count == 2; }));
 }
 
+TEST_F(BoundedUserAgentAsyncTest, LimitKnowsTheStageOfTheExchangeThatWasStartedLast) {
+  Bound(Silent(), Clock::time_point::max());
+  EXPECT_EQ(limit_->Stage(), ExchangeStage::kNone);
+  const auto first = Send();
+  EXPECT_EQ(limit_->Stage(), ExchangeStage::kConnection);
+  limit_->Cancel();
+  EXPECT_THROW(agent_->Wait(first.get(), 0), CancelledException);
+  EXPECT_EQ(limit_->Stage(), ExchangeStage::kNone);
+}
+
+TEST_F(BoundedUserAgentAsyncTest, LimitKnowsTheStagesOfAnAnswer) {
+  Bound({}, Clock::time_point::max());
+  const auto item = Send();
+  EXPECT_TRUE(Eventually([&] { return limit_->Stage() == ExchangeStage::kAnswer; }));
+  spec_->Streams().front()->Push("HTTP/1.1 200 OK\r\nContent-Length: 5\r\n\r\nhe");
+  EXPECT_TRUE(Eventually([&] { return limit_->Stage() == ExchangeStage::kRestOfAnswer; }));
+  spec_->Streams().front()->Push("llo");
+  agent_->Wait(item.get(), 0);
+  EXPECT_EQ(limit_->Stage(), ExchangeStage::kNone);
+}
+
 TEST_F(BoundedUserAgentAsyncTest, AnItemCancelsOnlyItsExchange) {
   Bound({}, Clock::now() + 1h);
   const auto record = std::make_shared<CompletionRecord>();

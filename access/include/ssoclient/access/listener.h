@@ -53,14 +53,12 @@ struct ClockRecord {
 };
 
 /// A field of an issued token that is not what the request asked for. The token is handed out
-/// nevertheless, as the client does. Compared are
-///  - "subject": with a user name of the form "name@domain", the subject of the token to renew or
-///  to
-///    exchange, or that of the act-as token;
+/// nevertheless, as the client does. What is compared:
+///  - "subject": with a user name of the form "name@domain", with the subject of the token to
+///    renew or to exchange, or with that of the act-as token;
 ///  - "audiences": as sets;
-///  - "lifetime": from the answer to the end, by the service's clock, if it differs by more than
-///  two
-///    seconds, a hundredth and the duration of the exchange;
+///  - "lifetime": from the answer to the end, by the service's clock, if the difference is larger
+///    than two seconds, a hundredth and the duration of the exchange together;
 ///  - "confirmation": bearer or holder-of-key, and the key;
 ///  - "delegable" and "renewable".
 struct DeviationRecord {
@@ -82,11 +80,15 @@ struct RefreshFailureRecord {
   std::chrono::milliseconds nextAttempt{0};  ///< from now
 };
 
-/// Sees what a token source does. Records never contain a password, a key, or the text of a token.
+/// Sees what a token source does. Records never contain a password, a key, or the text of a token;
+/// where a service repeats the password in a text, there are asterisks in its place, also if the
+/// text is escaped as in XML. When memory runs out, records other than those of attempts may be
+/// missing.
+///
 /// The functions do nothing unless they are overridden. They run on worker threads of the platform
-/// (on others only when no worker can be started), several at once, should return quickly, and must
-/// not throw or call the source. Later versions
-/// add no functions here, but may add an interface that is derived from this one.
+/// (on others only when no worker can be started), several at once. They should return quickly, and
+/// must not throw or call the source. Later versions add no functions here, but may add an
+/// interface that is derived from this one.
 class SSOCLIENT_ACCESS_EXPORT AccessListener {
  public:
   virtual ~AccessListener();

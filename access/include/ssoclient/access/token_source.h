@@ -45,12 +45,23 @@ struct RetryConfig {
   /// The attempts of one request, at all endpoints together; at least 1. Each endpoint is asked
   /// once without delay; then there is a pause before each further round.
   int attempts = 4;
+  /// The attempts of the source that are under way at once; at least 1. Each endpoint has an equal
+  /// share of them, and at least one, so that an endpoint that does not answer leaves room for the
+  /// others. As many calls of the login's function run at once. Each occupies a worker thread of
+  /// the platform's pool, which has 256 for all sources of the process. Further requests ask
+  /// another endpoint if they may, or else wait for their turn without a thread, first come first
+  /// served.
+  int attemptsAtOnce = 64;
   /// The limit of one attempt, from the look-up of the host to the last byte of the answer (of the
   /// last leg, for a negotiation). At most 240 seconds, the limit of the client.
   std::chrono::milliseconds attemptTimeout{std::chrono::seconds{30}};
-  /// The pause before round n is random between 0 and `firstDelay` * 2^(n-2), limited to
-  /// `longestDelay`. The pauses between the refreshes of a key while they fail, and between the
-  /// probes of an endpoint, grow in the same way.
+  /// The pause before round n is random between half of and all of `firstDelay` * 2^(n-2), limited
+  /// to `longestDelay`. The pauses between the refreshes of a key while they fail, and between the
+  /// probes of an endpoint, grow in the same way. So with the defaults, after the first minute of
+  /// an outage, an endpoint that is down receives at most 120 requests an hour from the source, and
+  /// 80 on average, whatever the number of keys and of callers; and a service that refuses the
+  /// refreshes of a key receives at most 120 for it. Callers that wait for less than an attempt of
+  /// an endpoint takes to fail are not limited in this way.
   std::chrono::milliseconds firstDelay{500};
   std::chrono::milliseconds longestDelay{std::chrono::minutes{1}};
   /// A longer `Retry-After` of the service counts as this.

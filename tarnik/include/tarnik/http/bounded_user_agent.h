@@ -9,6 +9,17 @@
 
 namespace Tarnik::Http {
 
+/// What an exchange is waiting for.
+enum class ExchangeStage {
+  kNone,          ///< nothing: no exchange is under way
+  kLookUp,        ///< the look-up of the host
+  kConnection,    ///< the connection
+  kHandshake,     ///< what follows the connection, such as the TLS handshake
+  kSending,       ///< the request to be sent
+  kAnswer,        ///< the beginning of the answer
+  kRestOfAnswer,  ///< the rest of an answer that has begun to arrive
+};
+
 /// The limit that a caller sets to one call, or to several: a deadline, and a way to give up
 /// earlier. Thread-safe.
 class TARNIK_EXPORT CallLimit : public virtual Object {
@@ -23,6 +34,9 @@ class TARNIK_EXPORT CallLimit : public virtual Object {
   virtual void Cancel() = 0;
   /// True after `Cancel`.
   virtual bool IsCancelled() const noexcept = 0;
+  /// What the exchange under way under this limit is waiting for; of several, the one that was
+  /// started last. `kNone` also for an exchange of an agent that is not of this library.
+  virtual ExchangeStage Stage() const noexcept = 0;
 };
 
 /// A limit that ends at `deadline`; with `Clock::time_point::max()` it ends only by `Cancel`.
