@@ -99,6 +99,7 @@ class Core : public std::enable_shared_from_this<Core> {
   bool RunLogin(const RequestPtr& request, Step& step);
   bool RunAttempt(const RequestPtr& request, Step& step, const std::string& secret);
   bool Admit(const RequestPtr& request, Step& step);
+  EndpointSet::Order OrderFor(const Request& request, const Instant& now);
   bool MayLogIn(Section& section, const RequestPtr& request, const Step& step, const Instant& now);
   Failure RememberedRefusal(const RequestPtr& request, const Step& step, const Instant& now);
   void LeaveGate(Section& section, const RequestPtr& request, LoginVerdict verdict,

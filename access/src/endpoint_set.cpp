@@ -24,7 +24,10 @@ EndpointSet::EndpointSet(const RetryConfig& config,
   }
 }
 
-EndpointSet::Index EndpointSet::Nth(std::size_t n) const {
+EndpointSet::Index EndpointSet::Nth(std::size_t n, Order order) const noexcept {
+  if (order == Order::kAsListed) {
+    return n;
+  }
   if (n == 0) {
     return preferred_;
   }
@@ -40,9 +43,9 @@ bool EndpointSet::CanAdmit(const Asked& asked, Instant::Steady now) const {
   return false;
 }
 
-EndpointSet::Admission EndpointSet::Admit(const Asked& asked, Instant::Steady now) {
+EndpointSet::Admission EndpointSet::Admit(const Asked& asked, Instant::Steady now, Order order) {
   for (std::size_t n = 0; n < Size(); ++n) {
-    const Index index = Nth(n);
+    const Index index = Nth(n, order);
     const CircuitState before = members_[index].circuit.State();
     if (!asked[index] && members_[index].circuit.Admit(now)) {
       return {index, ChangeSince(before, index, now)};
@@ -51,11 +54,13 @@ EndpointSet::Admission EndpointSet::Admit(const Asked& asked, Instant::Steady no
   return {};
 }
 
-EndpointSet::Change EndpointSet::OnAnswer(Index index) {
+EndpointSet::Change EndpointSet::OnAnswer(Index index, bool isPreferred) {
   Member& member = members_[index];
   const CircuitState before = member.circuit.State();
   member.circuit.OnAnswer();
-  preferred_ = index;
+  if (isPreferred) {
+    preferred_ = index;
+  }
   return ChangeSince(before, index, {});
 }
 

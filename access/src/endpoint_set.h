@@ -15,7 +15,8 @@
 namespace SsoClient::Access {
 
 /// The endpoints of a source, each with its circuit. The preferred one is asked first: the one that
-/// answered last, at first the first. Not thread-safe.
+/// answered last, at first the first. A refresh that is in no hurry asks them in the listed order,
+/// so that the source returns to the first one. Not thread-safe.
 class EndpointSet {
  public:
   using Index = std::size_t;
@@ -23,6 +24,7 @@ class EndpointSet {
   using Asked = std::vector<bool>;
   /// The new state of a circuit; not set when it has not changed.
   using Change = boost::optional<CircuitRecord>;
+  enum class Order { kPreferredFirst, kAsListed };
 
   EndpointSet(const RetryConfig& config, std::vector<std::unique_ptr<EndpointClient>> clients);
 
@@ -40,10 +42,10 @@ class EndpointSet {
     Change change;
   };
   /// The next endpoint that is not in `asked`. Its outcome must be reported.
-  Admission Admit(const Asked& asked, Instant::Steady now);
+  Admission Admit(const Asked& asked, Instant::Steady now, Order order = Order::kPreferredFirst);
 
-  /// The endpoint has answered, and is preferred now. `change` closes the circuit.
-  Change OnAnswer(Index index);
+  /// The endpoint has answered, which closes the circuit, and is preferred now if it `isPreferred`.
+  Change OnAnswer(Index index, bool isPreferred = true);
   Change OnFailure(Index index, const std::string& reason, std::chrono::milliseconds retryAfter,
                    Instant::Steady now, double draw);
   /// The attempt ended before the endpoint did anything. If the callers' deadlines had passed
@@ -71,8 +73,7 @@ class EndpointSet {
     bool isClockWrong = false;
   };
 
-  // The endpoints in the order in which they are asked.
-  Index Nth(std::size_t n) const;
+  Index Nth(std::size_t n, Order order) const noexcept;
   Change ChangeSince(CircuitState before, Index index, Instant::Steady now) const;
 
   std::vector<Member> members_;

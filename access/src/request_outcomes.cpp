@@ -76,7 +76,10 @@ bool Core::Conclude(const RequestPtr& request, Step& step, AttemptOutcome outcom
 void Core::NoteOutcome(Section& section, const RequestPtr& request, const Step& step,
                        const AttemptOutcome& outcome, const Instant& now) {
   if (IsAnswer(outcome.kind)) {
-    const EndpointSet::Change change = endpoints_.OnAnswer(step.endpoint);
+    // A service that is back, but refuses, is not preferred: the next attempt begins elsewhere.
+    const bool isPreferred =
+        outcome.token != nullptr || step.order == EndpointSet::Order::kPreferredFirst;
+    const EndpointSet::Change change = endpoints_.OnAnswer(step.endpoint, isPreferred);
     section.Circuit(change);
     if (change) {
       EndOutage(section, now);

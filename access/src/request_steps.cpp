@@ -200,7 +200,8 @@ bool Core::Admit(const RequestPtr& request, Step& step) {
   if (request->hasEnded || !MayLogIn(section, request, step, now)) {
     return false;
   }
-  const EndpointSet::Admission admission = endpoints_.Admit(request->asked, now.steady);
+  step.order = OrderFor(*request, now);
+  const EndpointSet::Admission admission = endpoints_.Admit(request->asked, now.steady, step.order);
   section.Circuit(admission.change);
   if (!admission.endpoint) {
     LeaveGate(section, request, LoginVerdict::kUndecided, {}, now);
@@ -221,6 +222,18 @@ bool Core::Admit(const RequestPtr& request, Step& step) {
                           entry->Life().IsUsable(now, std::chrono::seconds(0));
   step.record.number = ++request->attempts;
   return true;
+}
+
+// A refresh returns to the first endpoint when a failure there does no harm: it is the first
+// attempt to refresh the token, nobody waits, and the token outlasts it.
+EndpointSet::Order Core::OrderFor(const Request& request, const Instant& now) {
+  const RefreshSchedule::Item* item = schedule_.Find(request.key);
+  const EntryPtr entry = cache_.Peek(SpecView(*request.key));
+  const bool isHarmless =
+      request.isBackground && request.undecided == 0 && request.waiters.empty() &&
+      entry != nullptr && item != nullptr && item->failures == 0 &&
+      entry->Life().usableUntil.steady - now.steady > config_->retry.attemptTimeout;
+  return isHarmless ? EndpointSet::Order::kAsListed : EndpointSet::Order::kPreferredFirst;
 }
 
 bool Core::MayLogIn(Section& section, const RequestPtr& request, const Step& step,
