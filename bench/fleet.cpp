@@ -110,13 +110,14 @@ TokenSpec MakeSpec(const FleetPlan& plan) {
 class Server {
  public:
   Server(Simulation& simulation, const FleetPlan& plan, FleetReport& report, Core::Parts parts,
-         std::uint64_t seed)
+         Simulation::Time begun, std::uint64_t seed)
       : simulation_(simulation),
         plan_(plan),
         report_(report),
         spec_(MakeSpec(plan)),
         core_(Core::Create(std::move(parts))),
-        random_(seed) {}
+        random_(seed),
+        begun_(begun) {}
 
   void ScheduleCall() {
     std::exponential_distribution<double> distance(1.0 / plan_.betweenCalls.count());
@@ -134,6 +135,8 @@ class Server {
     }
     ScheduleCall();
     ++report_.calls;
+    const auto elapsed = simulation_.Now().steady - begun_;
+    report_.callsDuringOutage += elapsed >= plan_.death && elapsed < plan_.comeback ? 1 : 0;
     if (core_->TryGetToken(spec_) != nullptr) {
       Succeed();
       return;
@@ -177,6 +180,7 @@ class Server {
   const TokenSpec spec_;
   const std::shared_ptr<Core> core_;
   Random random_;
+  const Simulation::Time begun_;  ///< of the simulation
   std::optional<Simulation::Time> withoutTokenSince_;
   bool hasEnded_ = false;
 };
@@ -197,7 +201,7 @@ class Fleet {
  public:
   explicit Fleet(const FleetPlan& plan) : plan_(plan) {
     for (std::size_t i = 0; i < kServices; ++i) {
-      services_[i] = std::make_unique<Service>(simulation_, plan_, i == 0);
+      services_[i] = std::make_unique<Service>(simulation_, plan_, i < plan_.dying);
     }
     Order order{};
     std::iota(order.begin(), order.end(), 0U);
@@ -208,21 +212,20 @@ class Fleet {
   }
 
   FleetReport Run() {
-    const Simulation::Time begun = simulation_.Now().steady;
     for (std::size_t i = 0; i < plan_.servers; ++i) {
-      simulation_.At(begun + plan_.start * i / plan_.servers, [this, i] { StartServer(i); });
+      simulation_.At(begun_ + plan_.start * i / plan_.servers, [this, i] { StartServer(i); });
     }
-    simulation_.PassUntil(begun + plan_.duration);
+    simulation_.PassUntil(begun_ + plan_.duration);
     for (const auto& server : servers_) {
       server->End();
     }
     simulation_.Settle();
     for (std::size_t i = 0; i < kServices; ++i) {
       report_.requests[i] = services_[i]->Requests();
+      report_.attemptsAtDead += services_[i]->AttemptsWhileDown();
       report_.requests[i].resize(
           static_cast<std::size_t>(plan_.duration / std::chrono::minutes(1)));
     }
-    report_.attemptsAtDead = services_.front()->AttemptsWhileDown();
     return report_;
   }
 
@@ -236,14 +239,15 @@ class Fleet {
       parts.clients.push_back(
           std::make_unique<Client>(parts.config->endpoints[i], *services_[orders_[list][i]]));
     }
-    servers_.push_back(
-        std::make_unique<Server>(simulation_, plan_, report_, std::move(parts), 2 * number + 2));
+    servers_.push_back(std::make_unique<Server>(simulation_, plan_, report_, std::move(parts),
+                                                begun_, 2 * number + 2));
     servers_.back()->ScheduleCall();
   }
 
   const FleetPlan& plan_;
   FleetReport report_;
   Simulation simulation_;
+  const Simulation::Time begun_ = simulation_.Now().steady;
   std::array<std::unique_ptr<Service>, kServices> services_;
   std::vector<Order> orders_;
   std::vector<std::shared_ptr<const TokenSourceConfig>> configs_;

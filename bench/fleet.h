@@ -25,12 +25,14 @@ enum class Outage {
   kSilent,   ///< nothing answers, until the limit of the attempt
 };
 
-/// Servers with one token source each, and three services, the first of which dies and comes back.
+/// Servers with one token source each, and three services, of which the first ones die and come
+/// back.
 struct FleetPlan {
   std::size_t servers = 10'000;
   std::chrono::hours duration{7 * 24};
-  std::chrono::hours death{3 * 24};
-  std::chrono::hours comeback{3 * 24 + 4};
+  std::size_t dying = 1;
+  std::chrono::minutes death = std::chrono::hours(3 * 24);
+  std::chrono::minutes comeback = std::chrono::hours(3 * 24 + 4);
   Outage outage = Outage::kSilent;
   ListOrder order = ListOrder::kShuffled;
   SsoClient::Access::RefreshConfig refresh;
@@ -48,6 +50,7 @@ struct FleetReport {
   std::array<std::vector<std::uint32_t>, kServices> requests;
   std::uint64_t attemptsAtDead = 0;
   std::uint64_t calls = 0;
+  std::uint64_t callsDuringOutage = 0;
   std::uint64_t callsThatWaited = 0;
   std::chrono::milliseconds longestWait{0};
   std::uint64_t callsWithoutToken = 0;

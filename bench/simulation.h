@@ -96,7 +96,8 @@ class Simulation {
 };
 
 /// A runtime for one token source. `simulation` must outlive it. The random numbers follow from
-/// `seed`.
+/// `seed`. The source must not be stopped: to wait for others, it counts what runs on its thread,
+/// which is everything here.
 std::shared_ptr<SsoClient::Access::Runtime> CreateRuntime(Simulation& simulation,
                                                           std::uint64_t seed);
 

@@ -29,8 +29,9 @@ using SsoClient::TokenSpec;
 using SsoClient::Access::TokenSource;
 
 constexpr char kUser[] = "alice@EXAMPLE.COM";
-constexpr int kRounds = 60;
-constexpr std::size_t kHits = 20'000;
+constexpr int kRounds = 300;
+constexpr std::size_t kHits =
+    4'000;  // so few that a round is over before the thread is interrupted
 constexpr std::size_t kKeys = 1000;
 
 /// Specs that are asked for in turn.

@@ -83,6 +83,8 @@ void AcquireBySource(benchmark::State& state, const DevSts& sts) {
 template <class Run>
 void Add(const std::string& name, Run run, const DevSts& sts) {
   benchmark::RegisterBenchmark(name.c_str(), run, sts)
+      ->Iterations(
+          25)  // the same for both, or the shorter one has the better chance of a good moment
       ->MeasureProcessCPUTime()
       ->UseRealTime()
       ->Unit(benchmark::kMicrosecond);
