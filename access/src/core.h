@@ -117,6 +117,7 @@ class Core : public std::enable_shared_from_this<Core> {
   // turns: request_turns.cpp
   bool EnterFunction(const RequestPtr& request);
   void ReturnFunction(Section& section) noexcept;
+  EndpointSet::Order OrderFor(const Request& request, const Instant& now) noexcept;
   bool TakePlace(Section& section, const RequestPtr& request, const Instant& now);
   void ReturnPlaces(Section& section, const RequestPtr& request) noexcept;
   void ReturnPlace(Section& section, const RequestPtr& request) noexcept;

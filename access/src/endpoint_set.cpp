@@ -31,7 +31,10 @@ EndpointSet::EndpointSet(const RetryConfig& config,
   }
 }
 
-EndpointSet::Index EndpointSet::Nth(std::size_t n) const noexcept {
+EndpointSet::Index EndpointSet::Nth(std::size_t n, Order order) const noexcept {
+  if (order == Order::kAsListed) {
+    return n;
+  }
   if (n == 0) {
     return preferred_;
   }
@@ -53,10 +56,10 @@ bool EndpointSet::HasPlace(Instant::Steady now) const noexcept {
   });
 }
 
-std::optional<EndpointSet::Index> EndpointSet::TakePlace(const Asked& asked,
-                                                         Instant::Steady now) noexcept {
+std::optional<EndpointSet::Index> EndpointSet::TakePlace(const Asked& asked, Instant::Steady now,
+                                                         Order order) noexcept {
   for (std::size_t n = 0; n < Size(); ++n) {
-    const Index index = Nth(n);
+    const Index index = Nth(n, order);
     Member& member = members_[index];
     if (!asked[index] && member.underWay < places_ && member.circuit.CanAdmit(now)) {
       ++member.underWay;
@@ -72,11 +75,13 @@ EndpointSet::Change EndpointSet::Begin(Index index, Instant::Steady now) noexcep
   return ChangeSince(before, index, now);
 }
 
-EndpointSet::Change EndpointSet::OnAnswer(Index index) noexcept {
+EndpointSet::Change EndpointSet::OnAnswer(Index index, bool isPreferred) noexcept {
   Member& member = members_[index];
   const CircuitState before = member.circuit.State();
   member.circuit.OnAnswer();
-  preferred_ = index;
+  if (isPreferred) {
+    preferred_ = index;
+  }
   return ChangeSince(before, index, {});
 }
 

@@ -18,7 +18,8 @@ namespace SsoClient::Access {
 
 /// The endpoints of a source, each with its circuit, and with places for the attempts that may be
 /// under way at once. The preferred one is asked first: the one that answered last, at first the
-/// first. Not thread-safe.
+/// first. A refresh that is in no hurry asks them in the listed order, so that the source returns
+/// to the first one. Not thread-safe.
 class EndpointSet {
  public:
   using Index = std::size_t;
@@ -31,6 +32,7 @@ class EndpointSet {
   };
   /// The new state of a circuit; not set when it has not changed.
   using Change = boost::optional<NewState>;
+  enum class Order { kPreferredFirst, kAsListed };
 
   EndpointSet(const RetryConfig& config, std::vector<std::unique_ptr<EndpointClient>> clients);
 
@@ -47,13 +49,14 @@ class EndpointSet {
   bool HasPlace(Instant::Steady now) const noexcept;
   /// Takes a place at the next endpoint that is not in `asked`, may be asked and has one. Not set
   /// when there is none.
-  std::optional<Index> TakePlace(const Asked& asked, Instant::Steady now) noexcept;
+  std::optional<Index> TakePlace(const Asked& asked, Instant::Steady now,
+                                 Order order = Order::kPreferredFirst) noexcept;
   void ReturnPlace(Index index) noexcept { --members_[index].underWay; }
 
   /// An attempt begins at an endpoint that may be asked. Its outcome must be reported.
   Change Begin(Index index, Instant::Steady now) noexcept;
-  /// The endpoint has answered, and is preferred now. The change closes the circuit.
-  Change OnAnswer(Index index) noexcept;
+  /// The endpoint has answered, which closes the circuit, and is preferred now if it `isPreferred`.
+  Change OnAnswer(Index index, bool isPreferred = true) noexcept;
   Change OnFailure(Index index, const Reason& reason, std::chrono::milliseconds retryAfter,
                    Instant::Steady now, double draw) noexcept;
   /// The attempt ended before the endpoint did anything. If the callers' deadlines had passed
@@ -82,8 +85,7 @@ class EndpointSet {
     bool isClockWrong = false;
   };
 
-  // The endpoints in the order in which they are asked.
-  Index Nth(std::size_t n) const noexcept;
+  Index Nth(std::size_t n, Order order) const noexcept;
   Change ChangeSince(CircuitState before, Index index, Instant::Steady now) const noexcept;
 
   std::vector<Member> members_;

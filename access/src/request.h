@@ -50,6 +50,8 @@ struct Request {
   TurnQueue::Ticket turnOfFunction;
   /// A place at an endpoint that is kept for it until its next attempt begins.
   std::optional<EndpointSet::Index> place;
+  /// The order in which that endpoint was chosen.
+  EndpointSet::Order order = EndpointSet::Order::kPreferredFirst;
   /// The same for the login's function.
   bool hasPlaceOfFunction = false;
 

@@ -91,7 +91,10 @@ void Core::NoteCircuit(Section& section, const RequestPtr& request, const Step& 
   const AttemptOutcome& outcome = result.outcome;
   endpoints_.ReturnPlace(step.endpoint);
   if (IsAnswer(outcome.kind)) {
-    const EndpointSet::Change change = endpoints_.OnAnswer(step.endpoint);
+    // A service that is back, but refuses, is not preferred: the next attempt begins elsewhere.
+    const bool isPreferred =
+        outcome.token != nullptr || step.order == EndpointSet::Order::kPreferredFirst;
+    const EndpointSet::Change change = endpoints_.OnAnswer(step.endpoint, isPreferred);
     section.Circuit(change);
     if (change) {
       EndOutage(section, now);

@@ -255,6 +255,7 @@ bool Core::Admit(const RequestPtr& request, Step& step) {
     return false;
   }
   step.endpoint = *request->place;
+  step.order = request->order;
   step.begun = now.steady;
   step.limit = Tarnik::Http::CreateCallLimit(now.steady + config_->retry.attemptTimeout);
   step.record.source = config_->name;

@@ -35,6 +35,18 @@ void Core::ReturnFunction(Section& section) noexcept {
   functionsUnderWay_ -= isPassedOn ? 0 : 1;
 }
 
+// A refresh returns to the first endpoint when a failure there does no harm: it is the first
+// attempt to refresh the token, nobody waits, and the token outlasts it.
+EndpointSet::Order Core::OrderFor(const Request& request, const Instant& now) noexcept {
+  const RefreshSchedule::Item* item = schedule_.Find(request.key);
+  const EntryPtr entry = cache_.Peek(SpecView(*request.key));
+  const bool isHarmless =
+      request.isBackground && request.undecided == 0 && request.waiters.empty() &&
+      entry != nullptr && item != nullptr && item->failures == 0 &&
+      entry->Life().usableUntil.steady - now.steady > config_->retry.attemptTimeout;
+  return isHarmless ? EndpointSet::Order::kAsListed : EndpointSet::Order::kPreferredFirst;
+}
+
 // Makes sure that the request has a place at an endpoint that it may ask. False when it has to
 // wait, or its round has ended.
 bool Core::TakePlace(Section& section, const RequestPtr& request, const Instant& now) {
@@ -45,7 +57,8 @@ bool Core::TakePlace(Section& section, const RequestPtr& request, const Instant&
   if (!request->place) {
     // Those that came first, if an endpoint has become usable by the passing of time.
     ServeTurns(section, now);
-    request->place = endpoints_.TakePlace(request->asked, now.steady);
+    request->order = OrderFor(*request, now);
+    request->place = endpoints_.TakePlace(request->asked, now.steady, request->order);
   }
   if (request->place) {
     return true;
@@ -84,7 +97,8 @@ void Core::ServeTurns(Section& section, const Instant& now) noexcept {
     if (!endpoints_.HasPlace(now.steady)) {
       return TurnQueue::Decision::kStop;
     }
-    request->place = endpoints_.TakePlace(request->asked, now.steady);
+    request->order = OrderFor(*request, now);
+    request->place = endpoints_.TakePlace(request->asked, now.steady, request->order);
     if (!request->place) {
       return TurnQueue::Decision::kKeep;
     }

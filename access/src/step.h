@@ -20,6 +20,7 @@ struct Step {
   /// The token to renew or to exchange.
   std::shared_ptr<const SamlToken> base;
   SecretTagger::Tag tag = 0;  ///< of the password; zero for other logins
+  EndpointSet::Order order = EndpointSet::Order::kPreferredFirst;
   EndpointSet::Index endpoint = 0;
   Tarnik::Ref<Tarnik::Http::CallLimit> limit;
   AttemptRecord record;

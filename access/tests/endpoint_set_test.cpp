@@ -64,6 +64,23 @@ TEST_F(EndpointSetTest, LastGoodOneIsFirst) {
   EXPECT_EQ(Order(), (Urls{"https://c", "https://a", "https://b"}));
 }
 
+TEST_F(EndpointSetTest, AnswerThatIsNotPreferredChangesNoOrder) {
+  set.OnAnswer(1);
+  set.OnAnswer(2, false);
+  EXPECT_EQ(Order(), (Urls{"https://b", "https://a", "https://c"}));
+}
+
+TEST_F(EndpointSetTest, ListedOrderBeginsAtTheFirstThatIsNotLeftOut) {
+  constexpr auto kAsListed = EndpointSet::Order::kAsListed;
+  const EndpointSet::Asked none(3);
+  set.OnAnswer(2);
+  EXPECT_EQ(set.Admit(none, now, kAsListed).endpoint.value(), 0U);
+  FailOnce(0);
+  FailOnce(0);
+  EXPECT_EQ(set.Admit(none, now, kAsListed).endpoint.value(), 1U);
+  EXPECT_EQ(set.Admit(none, now).endpoint.value(), 2U);
+}
+
 TEST_F(EndpointSetTest, OpenCircuitsAreLeftOut) {
   EXPECT_FALSE(FailOnce(0));
   const auto change = FailOnce(0);

@@ -253,6 +253,89 @@ TEST_F(RefreshTest, SilentServiceOccupiesFewThreads) {
   EXPECT_GE(Attempts(), 300U);
 }
 
+// The first endpoint is down until the source has a token of the second one.
+class ReturnTest : public RefreshTest {
+ protected:
+  void FailOver() {
+    scripts[0]->Set(Fails(Unreachable()));
+    Make();
+    ASSERT_NE(Get(spec).token, nullptr);
+    ASSERT_EQ(scripts[1]->Count(), 1U);
+    source->TryGetToken(spec);
+    scripts[0]->Set(Issues(hours(1)));
+  }
+  static TokenSpec Other() { return SpecFor("https://other"); }
+};
+
+TEST_F(ReturnTest, RefreshReturnsToTheFirstEndpointAndCallersFollow) {
+  FailOver();
+  Get(Other());
+  EXPECT_EQ(scripts[1]->Count(), 2U);  // where the last answer came from
+  runtime->Advance(minutes(52));
+  EXPECT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[1]->Count(), 2U);
+  Get(SpecFor("https://third"));
+  EXPECT_EQ(scripts[0]->Count(), 3U);
+}
+
+TEST_F(ReturnTest, FirstEndpointThatIsStillDownCostsEachRefreshOneAttempt) {
+  FailOver();
+  scripts[0]->Set(Fails(Unreachable()));
+  runtime->Advance(minutes(52));
+  EXPECT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[1]->Count(), 2U);
+  Get(Other());
+  EXPECT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[1]->Count(), 3U);
+}
+
+TEST_F(ReturnTest, FirstEndpointThatIsBackButRefusesIsLeftAgain) {
+  FailOver();
+  scripts[0]->Set(Fails(Fault()));
+  const auto before = source->TryGetToken(spec);
+  runtime->Advance(minutes(52));
+  EXPECT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[1]->Count(), 2U);
+  EXPECT_NE(source->TryGetToken(spec), before);
+  EXPECT_NE(Get(Other()).token, nullptr);
+  EXPECT_EQ(scripts[0]->Count(), 2U);
+}
+
+TEST_F(ReturnTest, RefreshGoesOnAtTheLastEndpoint) {
+  config.endpoints.push_back({"https://c.example.com/sts", ""});
+  scripts[1]->Set(Fails(Unreachable()));
+  scripts[0]->Set(Fails(Unreachable()));
+  Make();
+  Get(spec);
+  source->TryGetToken(spec);
+  runtime->Advance(minutes(52));
+  EXPECT_EQ(scripts[0]->Count(), 2U);
+  EXPECT_EQ(scripts[1]->Count(), 1U);
+  EXPECT_EQ(scripts[2]->Count(), 2U);
+}
+
+TEST_F(ReturnTest, RefreshThatACallerWaitsForBeginsAtTheLastEndpoint) {
+  config.refresh.jitter = 0;
+  FailOver();
+  runtime->Pass(minutes(46));
+  CallContext context;
+  context.minimumLife = minutes(30);
+  EXPECT_NE(Get(spec, context).token, nullptr);
+  EXPECT_EQ(scripts[0]->Count(), 1U);
+  EXPECT_EQ(scripts[1]->Count(), 2U);
+}
+
+TEST_F(ReturnTest, RefreshOfATokenThatTheAttemptMayOutlastStaysWithTheLastEndpoint) {
+  config.refresh.fraction = 0.9;  // three minutes before the margin
+  config.refresh.jitter = 0;
+  config.refresh.longestMargin = minutes(3);
+  config.retry.attemptTimeout = minutes(4);
+  FailOver();
+  runtime->Advance(minutes(56));
+  EXPECT_EQ(scripts[0]->Count(), 1U);
+  EXPECT_EQ(scripts[1]->Count(), 2U);
+}
+
 TEST_F(RefreshTest, ManyKeysThatAreDueInOneMomentAreAllRefreshed) {
   config.login = CertificateLogin{};
   config.holderOfKey = HolderOfKeyConfig{Tarnik::MakeRef<NamedCertificate>("own"), nullptr};

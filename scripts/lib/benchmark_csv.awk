@@ -16,7 +16,7 @@ BEGIN { FS = "," }
 "cpu_time" in column {
   # The name also says how the time is measured.
   name = $1
-  gsub(/"|\/process_time|\/real_time|\/repeats:[0-9]*/, "", name)
+  gsub(/"|\/process_time|\/real_time|\/repeats:[0-9]*|\/iterations:[0-9]*/, "", name)
   keep_smaller(cpu, name, $column["cpu_time"])
   keep_smaller(real, name, $column["real_time"])
 }

@@ -83,7 +83,9 @@ struct CacheConfig {
 struct TokenSourceConfig {
   /// Names the source in records and log lines; may be empty.
   std::string name{};
-  /// At least one. All accept the same logins and issue tokens that `tokenFactory` accepts.
+  /// At least one. All accept the same logins and issue tokens that `tokenFactory` accepts. The
+  /// order is that of preference. Sources with the same order all use the first one while it
+  /// answers; many servers that are to share equal endpoints list them in different orders.
   std::vector<Endpoint> endpoints{};
   /// The TLS trust and settings; may be null if all endpoints are http URLs.
   Tarnik::Ref<Tarnik::Ssl::SSLContext> sslContext{};
@@ -145,7 +147,10 @@ struct TokenSourceMetrics {
 /// Requests go to the endpoint that answered last. When it fails in a way that no service has
 /// decided (`AllowsFailover`), the next one is asked; an endpoint that fails repeatedly is left out
 /// until a probe succeeds. When all are left out, a call fails at once, with the reason of each. A
-/// SOAP fault and a token that is not accepted are decisions: no other endpoint is asked.
+/// SOAP fault and a token that is not accepted are decisions: no other endpoint is asked. The first
+/// attempt to refresh a token begins at the first endpoint of the list that is not left out, unless
+/// a caller waits or the token would not outlast the attempt (`RetryConfig::attemptTimeout`): so a
+/// source returns to its first endpoint after a failure, and callers do not wait for that.
 ///
 /// A refused login reaches one endpoint once, however many callers and specs there are: until a
 /// login has succeeded with a secret, only one is under way, and again when the last success was
