@@ -11,7 +11,7 @@ namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::Testing::CommandResult;
-using testing::MatchesRegex;
+using testing::ContainsRegex;
 using testing::StartsWith;
 
 class KeepFreshKerberosTest : public RealmTest {
@@ -22,6 +22,7 @@ class KeepFreshKerberosTest : public RealmTest {
                                        EXAMPLES_FOLDER "/keep_fresh_kerberos " + service_ + " " +
                                        kTarget + arguments + " 2>&1");
   }
+  /// A warning about the last leg may precede them.
   static std::string TwoTokensOf(const std::string& user) {
     const std::string line = "a token of " + user + " valid until [0-9]{4}-[0-9T:.-]+Z\n";
     return line + line;
@@ -36,7 +37,7 @@ class KeepFreshKerberosTest : public RealmTest {
 TEST_F(KeepFreshKerberosTest, LogsInOnceWithATicket) {
   const CommandResult run = RunWith(AsAlice().credentialCache);
   EXPECT_EQ(run.status, 0);
-  EXPECT_THAT(run.output, MatchesRegex(TwoTokensOf("alice")));
+  EXPECT_THAT(run.output, ContainsRegex(TwoTokensOf("alice")));
   EXPECT_EQ(Legs().size(), 1U);
 }
 
@@ -45,7 +46,7 @@ TEST_F(KeepFreshKerberosTest, LogsInWithAKeytab) {
   const CommandResult run =
       RunWith("FILE:/nonexistent/cache", " " + machine.principal + " " + machine.keytab);
   EXPECT_EQ(run.status, 0);
-  EXPECT_THAT(run.output, MatchesRegex(TwoTokensOf("machine")));
+  EXPECT_THAT(run.output, ContainsRegex(TwoTokensOf("machine")));
 }
 
 TEST_F(KeepFreshKerberosTest, FailsWithoutATicket) {

@@ -13,13 +13,14 @@
 #include <tarnik/http/http_url.h>
 #include <tarnik/http/http_user_agent.h>
 
-#include "integration/sts_fixture.h"
+#include "integration/holder_of_key_fixture.h"
 #include "support/child_process.h"
 #include "support/temporary_file.h"
 
 namespace SsoClient::Access {
 namespace {
 
+using SsoClient::Testing::Holder;
 using SsoClient::Testing::kPassword;
 using SsoClient::Testing::kUser;
 using Tarnik::Testing::CommandResult;
@@ -34,7 +35,7 @@ CommandResult RunExample(const std::string& command) {
   return Tarnik::Testing::RunInShell(EXAMPLES_FOLDER "/" + command + " 2>&1");
 }
 
-class AccessExamplesTest : public SsoClient::Testing::StsTest {
+class AccessExamplesTest : public SsoClient::Testing::HolderOfKeyTest {
  protected:
   std::string WritePassword(const std::string& password) const {
     return folder_.Write("password", password + "\n");
@@ -107,6 +108,33 @@ TEST_F(AccessExamplesTest, AwaitTokenRequestsBothTokens) {
   EXPECT_EQ(refused.status, 1);
   EXPECT_THAT(refused.output, StartsWith("No token: "));
   EXPECT_EQ(Sts().Requests().size(), 3U);
+}
+
+TEST_F(AccessExamplesTest, ActAsFreshExchangesOnceForAllLines) {
+  const auto user = AcquireBound();
+  Sts().ClearRequests();
+  const std::string command = "act_as_fresh " + Sts().HttpsUrl() + " " + trust_ + " " +
+                              folder_.Write("client.pem", Holder().certificatePem) + " " +
+                              folder_.Write("key.pem", Holder().privateKeyPem) + " ";
+  const CommandResult run =
+      RunExample(command + folder_.Write("users.xml", user->Xml()) + " <" + lines_);
+  EXPECT_EQ(run.status, 0);
+  const std::string line = "a token for alice valid until " + std::string(kEnd) + "\n";
+  EXPECT_THAT(run.output, MatchesRegex(line + line + line));
+  // The server's own token, and the exchange.
+  EXPECT_EQ(Sts().Requests().size(), 2U);
+
+  const CommandResult missing = RunExample(command + "/nonexistent/token.xml <" + lines_);
+  EXPECT_EQ(missing.status, 1);
+  EXPECT_THAT(missing.output, StartsWith("No token: "));
+}
+
+TEST_F(AccessExamplesTest, FakeTokenSourceNeedsNoService) {
+  const auto token = Acquire();
+  const CommandResult run = RunExample("fake_token_source " + folder_.Write("t.xml", token->Xml()));
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.output, "please try again later\nuser alice\n");
+  EXPECT_EQ(RunExample("fake_token_source /nonexistent/token.xml").status, 1);
 }
 
 #if EXAMPLES_EXPORT_METRICS
