@@ -22,14 +22,16 @@ class RealmEnvironment : public testing::Environment {
       realm.AddUser("nobody", "nobody-secret");
       aliceCache = realm.Login("alice", "alice-secret");
       machineKeytab = realm.AddKeytab("machine");
+      serviceKeytab = realm.AddKeytab("HTTP/sts.example");
       DevSts::ServerOptions options;
-      options.negotiation.keytab = realm.AddKeytab("HTTP/sts.example");
+      options.negotiation.keytab = serviceKeytab;
       sts = std::make_unique<DevSts::Server>(options);
     }
 
     DevSts::KerberosRealm realm;
     std::string aliceCache;
     std::string machineKeytab;
+    std::string serviceKeytab;
     std::unique_ptr<DevSts::Server> sts;
   };
 
@@ -64,6 +66,10 @@ DevSts::KerberosRealm& RealmTest::Realm() {
 
 DevSts::Server& RealmTest::Sts() {
   return *environment->parts->sts;
+}
+
+const std::string& RealmTest::ServiceKeytab() {
+  return environment->parts->serviceKeytab;
 }
 
 std::shared_ptr<SecurityTokenService> RealmTest::Service() {

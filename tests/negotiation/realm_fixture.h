@@ -2,6 +2,7 @@
 #define SSOCLIENT_TESTS_NEGOTIATION_REALM_FIXTURE_H
 
 #include <memory>
+#include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -35,6 +36,8 @@ class RealmTest : public testing::Test {
 
   static DevSts::KerberosRealm& Realm();
   static DevSts::Server& Sts();
+  /// The key of `Sts()`, for another service of the same name.
+  static const std::string& ServiceKeytab();
 
   /// Logs in to `Sts()`.
   static std::shared_ptr<SecurityTokenService> Service();

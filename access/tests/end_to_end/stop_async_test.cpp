@@ -1,0 +1,139 @@
+// Sources that are stopped or destroyed with callers inside.
+#include <atomic>
+#include <chrono>
+#include <future>
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include <gmock/gmock.h>
+
+#include "end_to_end/end_to_end_fixture.h"
+
+namespace SsoClient::Access::Testing {
+namespace {
+
+using namespace std::chrono_literals;
+using Clock = std::chrono::steady_clock;
+
+constexpr std::size_t kAsyncCallers = 300;
+constexpr std::size_t kBlockedCallers = 16;
+// Far from the limits of the calls, also on a busy machine.
+constexpr auto kSoon = 5s;
+
+class StopAsyncTest : public EndToEndTest {
+ protected:
+  StopAsyncTest() { sts_.SetMisbehavior(Stalling(DevSts::Stall::BeforeAnswer)); }
+
+  /// Calls for the tokens of a few specs.
+  void BeginCalls() {
+    for (std::size_t i = 0; i < kAsyncCallers; ++i) {
+      calls_.Begin(*source_, SpecFor(i % 8));
+    }
+  }
+  void ExpectStopped() {
+    for (const Result& result : calls_.Wait()) {
+      EXPECT_TRUE(result.Is<Tarnik::InvalidStateException>()) << result.type << result.message;
+      EXPECT_EQ(result.reports, 1);
+    }
+    EXPECT_TRUE(sts_.WaitUntil([](const auto& seen) { return seen.connectionsOpen == 0; }, 1min));
+  }
+
+  DevSts::Server sts_;
+  std::shared_ptr<TokenSource> source_ = Make(ConfigFor({&sts_}));
+  TokenCalls calls_;
+};
+
+TEST_F(StopAsyncTest, StopEndsAllCallers) {
+  std::vector<std::thread> threads;
+  std::vector<Result> blocked(kBlockedCallers);
+  BeginCalls();
+  for (std::size_t i = 0; i < kBlockedCallers; ++i) {
+    threads.emplace_back([&, i] { blocked[i] = Get(*source_, SpecFor(i)); });
+  }
+  AwaitCallers(*source_, kAsyncCallers + kBlockedCallers);
+  const auto begun = Clock::now();
+  EXPECT_TRUE(source_->Stop(30s));
+  EXPECT_LT(Clock::now() - begun, kSoon);
+  // No callback is running any more.
+  EXPECT_EQ(calls_.Reported(), kAsyncCallers);
+  for (std::thread& thread : threads) {
+    thread.join();
+  }
+  for (const Result& result : blocked) {
+    EXPECT_TRUE(result.Is<Tarnik::InvalidStateException>()) << result.type;
+  }
+  ExpectStopped();
+  EXPECT_TRUE(Get(*source_, SpecFor(0)).Is<Tarnik::InvalidStateException>());
+  EXPECT_THROW(source_->TryGetToken(SpecFor(0)), Tarnik::InvalidStateException);
+}
+
+TEST_F(StopAsyncTest, TheDestructorEndsAllCallers) {
+  BeginCalls();
+  AwaitCallers(*source_, kAsyncCallers);
+  const auto begun = Clock::now();
+  source_.reset();
+  EXPECT_LT(Clock::now() - begun, kSoon);
+  EXPECT_EQ(calls_.Reported(), kAsyncCallers);
+  ExpectStopped();
+}
+
+TEST_F(StopAsyncTest, StopReturnsAtItsLimitWhileTheLoginsFunctionRuns) {
+  Gate gate;
+  TokenSourceConfig config = ConfigFor({&sts_});
+  config.login = PasswordLogin{kUser, [&gate] {
+                                 gate.Pass();
+                                 return std::string(kPassword);
+                               }};
+  source_ = Make(config);
+  calls_.Begin(*source_, SpecFor(0));
+  ASSERT_TRUE(gate.Await(1));
+  const auto begun = Clock::now();
+  EXPECT_FALSE(source_->Stop(100ms));
+  EXPECT_GE(Clock::now() - begun, 100ms);
+  EXPECT_LT(Clock::now() - begun, kSoon);
+  ExpectStopped();
+  gate.Open();
+  EXPECT_TRUE(source_->Stop(30s));
+  EXPECT_TRUE(sts_.Requests().empty());
+}
+
+TEST_F(StopAsyncTest, ACallbackStopsTheSource) {
+  sts_.ClearMisbehavior();
+  std::promise<bool> stopped;
+  source_->GetTokenAsync(SpecFor(0), {}, [&](const auto&, const Tarnik::Exception*) {
+    stopped.set_value(source_->Stop(30s));
+  });
+  EXPECT_TRUE(stopped.get_future().get());
+  EXPECT_TRUE(Get(*source_, SpecFor(0)).Is<Tarnik::InvalidStateException>());
+}
+
+TEST_F(StopAsyncTest, ACallbackReleasesTheLastReference) {
+  sts_.ClearMisbehavior();
+  std::promise<void> released;
+  auto* const source = source_.get();
+  source->GetTokenAsync(SpecFor(0), {},
+                        [&released, kept = std::make_shared<std::shared_ptr<TokenSource>>(
+                                        std::move(source_))](const auto&, const auto*) {
+                          kept->reset();
+                          released.set_value();
+                        });
+  ASSERT_EQ(released.get_future().wait_for(1min), std::future_status::ready);
+}
+
+TEST_F(StopAsyncTest, RefreshesUnderWayEnd) {
+  TokenSourceConfig config = ConfigFor({&sts_});
+  for (std::size_t i = 0; i < 4; ++i) {
+    config.keepFresh.push_back(SpecFor(i));
+  }
+  source_ = Make(config);
+  ASSERT_TRUE(sts_.WaitUntil([](const auto& seen) { return seen.stalled >= 1; }, 1min));
+  const auto begun = Clock::now();
+  source_.reset();
+  EXPECT_LT(Clock::now() - begun, kSoon);
+  ExpectStopped();
+}
+
+}  // namespace
+}  // namespace SsoClient::Access::Testing
