@@ -50,7 +50,7 @@ struct Plan {
   }
 
   /// The number that the port's text begins with, as a caller may have read it.
-  int Port() const { return std::atoi(port.substr(0, 8).c_str()); }
+  int Port() const { return static_cast<int>(std::strtol(port.substr(0, 8).c_str(), nullptr, 10)); }
   bool IsSound() const {
     const bool isNamed = serverName.empty() || Fuzz::IsHostToCall(serverName);
     return Fuzz::IsHostToCall(host) && Port() >= 1 && Port() <= 65535 &&
