@@ -33,6 +33,16 @@ void RequireClean(const std::string& header, const std::string& input) {
   }
 }
 
+// The parent domain receives only cookies that were set for it, which the host receives too.
+void RequireSomeOf(const std::string& header, const std::string& all) {
+  for (std::size_t begin = 0; begin < header.size();) {
+    const std::size_t end = std::min(header.find("; ", begin), header.size());
+    const std::string pair = header.substr(begin, end - begin);
+    Fuzz::Require(("; " + all + "; ").find("; " + pair + "; ") != std::string::npos);
+    begin = end + 2;
+  }
+}
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
@@ -59,6 +69,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   for (const char* stranger : {"1.127.0.0.1", "0.0.1", "127.0.0.2", "sts.example.com"}) {
     Fuzz::Require(address->HeaderFor(stranger, "/a/b", true, now).empty());
   }
+  RequireSomeOf(store->HeaderFor("example.com", "/a/b", true, now), own);
   const std::string inTheClear = store->HeaderFor("sts.example.com", "/a/b", false, now);
   const std::string laterOn = store->HeaderFor("sts.example.com", "/a/b", true, muchLater);
   Fuzz::Require(inTheClear.size() <= own.size() && laterOn.size() <= own.size());

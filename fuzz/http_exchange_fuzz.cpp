@@ -7,7 +7,6 @@
 #include <limits>
 #include <optional>
 #include <string>
-#include <string_view>
 #include <vector>
 
 #include <fuzzer/FuzzedDataProvider.h>
@@ -22,111 +21,17 @@
 #include <tarnik/ssl/ssl_context.h>
 
 #include "fixed_clock.h"
-#include "http/response_parser.h"
 #include "input.h"
+#include "parsed_answer.h"
 #include "single_thread.h"
 #include "support/scripted_spec.h"
+#include "written_request.h"
 
 namespace {
 
 using namespace Tarnik;
 using Tarnik::Testing::ScriptedSpec;
 using Tarnik::Testing::ScriptedStream;
-
-struct Fields {
-  std::string method;
-  std::string target;
-  std::vector<std::pair<std::string, std::string>> headers;
-  std::string body;
-};
-
-std::string Lower(std::string text) {
-  std::transform(text.begin(), text.end(), text.begin(),
-                 [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c + 32) : c; });
-  return text;
-}
-
-/// Reads one request of RFC 9112 strictly and removes it from `wire`.
-Fields TakeRequest(std::string& wire) {
-  const auto line = [&wire] {
-    const std::size_t end = wire.find("\r\n");
-    Fuzz::Require(end != std::string::npos);
-    const std::string text = wire.substr(0, end);
-    wire.erase(0, end + 2);
-    Fuzz::Require(text.find_first_of(std::string("\r\n\0", 3)) == std::string::npos);
-    return text;
-  };
-  Fields request;
-  const std::string start = line();
-  const std::size_t first = start.find(' ');
-  const std::size_t second = start.find(' ', first + 1);
-  Fuzz::Require(second != std::string::npos && start.substr(second) == " HTTP/1.1");
-  request.method = start.substr(0, first);
-  request.target = start.substr(first + 1, second - first - 1);
-  std::size_t length = 0;
-  for (std::string field = line(); !field.empty(); field = line()) {
-    const std::size_t colon = field.find(": ");
-    Fuzz::Require(colon != std::string::npos && colon > 0);
-    request.headers.emplace_back(field.substr(0, colon), field.substr(colon + 2));
-    const std::string name = Lower(field.substr(0, colon));
-    Fuzz::Require(name != "transfer-encoding");
-    if (name == "content-length") {
-      length = std::stoul(field.substr(colon + 2));
-    }
-  }
-  Fuzz::Require(wire.size() >= length);
-  request.body = wire.substr(0, length);
-  wire.erase(0, length);
-  return request;
-}
-
-std::optional<std::string> ValueOf(const Fields& request, const std::string& name) {
-  std::optional<std::string> value;
-  for (const auto& [found, text] : request.headers) {
-    if (Lower(found) == Lower(name)) {
-      Fuzz::Require(!value);
-      value = text;
-    }
-  }
-  return value;
-}
-
-struct Answer {
-  int code = 0;
-  std::string body;
-  bool mayBeFollowed = false;
-};
-
-Answer AnswerOf(Http::ClientResponse& response) {
-  Answer answer{response.Status().code, ""};
-  char buffer[1024];
-  while (const std::size_t count = response.Body()->Read(buffer, sizeof(buffer))) {
-    answer.body.append(buffer, count);
-  }
-  return answer;
-}
-
-/// What the bytes contain; nothing if they are refused or incomplete.
-std::optional<Answer> Parsed(const std::string& bytes, bool hasEnd) {
-  Http::ResponseParser parser("sts.example:443");
-  try {
-    if (!bytes.empty()) {
-      parser.Feed(bytes);
-    }
-    if (hasEnd) {
-      parser.FeedEnd();
-    }
-  } catch (const Http::HttpException&) {
-    return std::nullopt;
-  }
-  if (!parser.IsDone()) {
-    return std::nullopt;
-  }
-  const bool mayBeFollowed = parser.MayReuseConnection();
-  Answer answer = AnswerOf(*parser.TakeResponse());
-  answer.mayBeFollowed = mayBeFollowed;
-  return answer;
-}
 
 std::string AnswerText(FuzzedDataProvider& input) {
   static const char* const kHeads[] = {
@@ -158,7 +63,9 @@ class Exchange {
       const std::string value = input.ConsumeRandomLengthString(12);
       try {
         request_->SetHeader(name, value);
-        std::erase_if(headers_, [&](const auto& old) { return Lower(old.first) == Lower(name); });
+        std::erase_if(headers_, [&](const auto& old) {
+          return Fuzz::LowerCase(old.first) == Fuzz::LowerCase(name);
+        });
         headers_.emplace_back(name, value);
       } catch (const InvalidArgumentException&) {
       }
@@ -173,7 +80,7 @@ class Exchange {
         [this](Exception* error, Http::ClientResponse* response, Http::PendingRequestItem*) {
           Fuzz::Require(++count_ == 1 && (error == nullptr) != (response == nullptr));
           if (response != nullptr) {
-            result_ = AnswerOf(*response);
+            result_ = Fuzz::AnswerOf(*response);
           }
           Fuzz::Require(error == nullptr || dynamic_cast<Http::HttpException*>(error) != nullptr ||
                         dynamic_cast<IOException*>(error) != nullptr ||
@@ -196,16 +103,16 @@ class Exchange {
   bool HasEnded() const { return count_ == 1; }
   void Cancel() { item_->Cancel(); }
   const std::string& AnswerBytes() const { return answer_; }
-  const std::optional<Answer>& Result() const { return result_; }
+  const std::optional<Fuzz::ParsedAnswer>& Result() const { return result_; }
 
   void CheckWritten(std::string& wire, const std::string& host) const {
-    const Fields written = TakeRequest(wire);
+    const Fuzz::WrittenRequest written = Fuzz::TakeRequest(wire);
     Fuzz::Require(written.method == method_ && written.target == target_);
-    Fuzz::Require(written.body == body_ && ValueOf(written, "Host") == host);
+    Fuzz::Require(written.body == body_ && Fuzz::HeaderOf(written, "Host") == host);
     for (const auto& [name, value] : headers_) {
-      Fuzz::Require(ValueOf(written, name) == value);
+      Fuzz::Require(Fuzz::HeaderOf(written, name) == value);
     }
-    const std::string cookies = ValueOf(written, "Cookie").value_or("");
+    const std::string cookies = Fuzz::HeaderOf(written, "Cookie").value_or("");
     Fuzz::Require(std::all_of(cookies.begin(), cookies.end(),
                               [](unsigned char c) { return c >= 0x20 && c != 0x7F; }));
   }
@@ -219,7 +126,7 @@ class Exchange {
   Ref<Http::ClientRequest> request_;
   Ref<Http::PendingRequestItem> item_;
   int count_ = 0;
-  std::optional<Answer> result_;
+  std::optional<Fuzz::ParsedAnswer> result_;
 };
 
 void RunAll() {
@@ -244,7 +151,7 @@ void Finish(Exchange& exchange, ScriptedStream& stream, Http::CallLimit& limit,
   }
   RunAll();
   Fuzz::Require(exchange.HasEnded());
-  const auto parsed = Parsed(exchange.AnswerBytes(), isPending && ending == 0);
+  const auto parsed = Fuzz::ParseAnswer(exchange.AnswerBytes(), isPending && ending == 0);
   Fuzz::Require(exchange.Result().has_value() == parsed.has_value());
   Fuzz::Require(!parsed || (parsed->code == exchange.Result()->code &&
                             parsed->body == exchange.Result()->body));
@@ -350,14 +257,14 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     const auto stream = spec->Streams().back();
     std::string wire = stream->Written();
     if (!isNew) {
-      TakeRequest(wire);
+      Fuzz::TakeRequest(wire);
     }
     // The port of the endpoint is the default port of HTTPS.
     exchange.CheckWritten(wire, script.isTls ? "sts.example" : "sts.example:443");
     Fuzz::Require(wire.empty());
     Finish(exchange, *stream, *limit, input);
     exchange.CheckWait(*agent);
-    const auto parsed = Parsed(exchange.AnswerBytes(), false);
+    const auto parsed = Fuzz::ParseAnswer(exchange.AnswerBytes(), false);
     mayReuse = isNew && parsed && parsed->mayBeFollowed;
   }
   return 0;

@@ -3,6 +3,7 @@
 // used again. It refuses every answer that is refused here, except for the rules in `kStricter`.
 #include <algorithm>
 #include <charconv>
+#include <map>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -153,6 +154,21 @@ Reading ReadWithSecond(std::string_view bytes) {
 
 // Ours.
 
+/// A look-up finds the first field of a name in any case.
+void RequireFirstValues(const Tarnik::Http::ClientResponseImpl& response) {
+  std::map<std::string, std::string> firstValues;
+  for (const auto& [name, value] : response.Headers()) {
+    std::string upper(name);
+    std::transform(upper.begin(), upper.end(), upper.begin(),
+                   [](char c) { return c >= 'a' && c <= 'z' ? static_cast<char>(c - 32) : c; });
+    firstValues.emplace(upper, value);
+  }
+  for (const auto& [name, value] : firstValues) {
+    Fuzz::Require(response.Header(name) == value);
+  }
+  Fuzz::Require(!response.Header("X-Not:A-Token"));
+}
+
 Message TakeMessage(Tarnik::Http::ResponseParser& parser) {
   Message message;
   message.letsAnotherFollow = parser.MayReuseConnection();
@@ -160,6 +176,7 @@ Message TakeMessage(Tarnik::Http::ResponseParser& parser) {
   message.code = response->Status().code;
   message.reason = response->Status().reason;
   message.fields = response->Headers();
+  RequireFirstValues(*response);
   char buffer[4096];
   while (const std::size_t count = response->Body()->Read(buffer, sizeof(buffer))) {
     message.body.append(buffer, count);

@@ -1,5 +1,9 @@
 #include "single_thread.h"
 
+#include <atomic>
+#include <future>
+#include <thread>
+
 #include <boost/asio/io_context.hpp>
 
 #include "input.h"
@@ -33,6 +37,24 @@ bool RunCompletions() {
   boost::asio::io_context& completions = Tarnik::System::ProcessThreadPool().IoContext();
   completions.restart();
   return completions.poll() != 0;
+}
+
+void RunCompletionsDuring(const std::function<void()>& wait) {
+  // Each thread has a context of its own.
+  std::promise<boost::asio::io_context*> context;
+  std::atomic<bool> hasReturned{false};
+  std::thread waiting([&] {
+    context.set_value(&Tarnik::System::ProcessThreadPool().IoContext());
+    wait();
+    hasReturned = true;
+  });
+  boost::asio::io_context& other = *context.get_future().get();
+  while (!hasReturned) {
+    RunCompletions();
+    other.restart();
+    other.poll();
+  }
+  waiting.join();
 }
 
 }  // namespace Fuzz

@@ -34,6 +34,7 @@ class TlsServer final : public Tarnik::System::Stream, public Tarnik::ObjectImpl
   /// Whether every record has arrived as it was sent.
   bool IsClean() const { return isClean_; }
   bool HasSentCloseNotify() const { return hasSentCloseNotify_; }
+  SSL* Ssl() const { return ssl_.get(); }
   bool WasResumed() const { return SSL_session_reused(ssl_.get()) == 1; }
   /// The data that the server has sent and received.
   const std::string& Sent() const { return sent_; }

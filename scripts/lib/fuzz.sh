@@ -25,6 +25,7 @@ list_fuzzers() {
 dictionary_of() {
   case $1 in
     canonicalizer_fuzz | response_handler_fuzz | token_reader_fuzz) echo "-dict=fuzz/xml.dict" ;;
+    connection_specs_fuzz | http_calls_fuzz | tls_client_fuzz) echo "-dict=fuzz/words.dict" ;;
   esac
 }
 
