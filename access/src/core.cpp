@@ -120,6 +120,14 @@ void Core::GetTokenAsync(const TokenSpec& spec, const CallContext& context,
   if (!callback) {
     throw Tarnik::InvalidArgumentException("The callback is empty.");
   }
+  GetAnswerAsync(spec, context, [callback = std::move(callback)](const Answer& answer) {
+    const auto failure = answer.failure.IsSet() ? answer.failure.ForCallback() : nullptr;
+    callback(answer.token, failure.get());
+  });
+}
+
+void Core::GetAnswerAsync(const TokenSpec& spec, const CallContext& context,
+                          AnswerCallback callback) {
   const auto caller =
       std::make_shared<CallbackCaller>(context, std::move(callback), runtime_, activity_);
   Answer answer;

@@ -61,6 +61,8 @@ class Core : public std::enable_shared_from_this<Core> {
   std::shared_ptr<const SamlToken> TryGetToken(const TokenSpec& spec);
   void GetTokenAsync(const TokenSpec& spec, const CallContext& context,
                      TokenSource::TokenCallback callback);
+  /// As `GetTokenAsync`, with the kind of a failure. The callback is not empty.
+  void GetAnswerAsync(const TokenSpec& spec, const CallContext& context, AnswerCallback callback);
   void Invalidate(const SamlToken& token);
   TokenSourceMetrics Metrics() const;
   bool Stop(std::chrono::milliseconds wait);
@@ -100,8 +102,7 @@ class Core : public std::enable_shared_from_this<Core> {
   bool Begin(const RequestPtr& request, Step& step);
   bool IsRenewable(const SamlToken& token) const;
   void RequestBase(const RequestPtr& request);
-  void ReceiveBase(const RequestPtr& request, const std::shared_ptr<const SamlToken>& token,
-                   const Tarnik::Exception* failure) noexcept;
+  void ReceiveBase(const RequestPtr& request, const Answer& answer) noexcept;
   bool RunLogin(const RequestPtr& request, Step& step);
   bool RunAttempt(const RequestPtr& request, Step& step, const std::string& secret);
   bool Admit(const RequestPtr& request, Step& step);

@@ -9,6 +9,7 @@
 #include "secret_text.h"
 #include "section.h"
 #include "step.h"
+#include "token_source_impl.h"
 
 namespace SsoClient::Access {
 
@@ -135,32 +136,38 @@ void Core::RequestBase(const RequestPtr& request) {
   const auto& login = std::get<TokenLogin>(config_->login);
   CallContext context;
   context.cancellation = request->cancellation.Token();
+  const auto receive = [self = shared_from_this(), request](const Answer& answer) {
+    self->ReceiveBase(request, answer);
+  };
+  // A source of this library knows the exact kind of a failure.
+  if (auto* const known = dynamic_cast<TokenSourceImpl*>(login.source.get())) {
+    known->GetAnswerAsync(login.spec, context, receive);
+    return;
+  }
   login.source->GetTokenAsync(
       login.spec, context,
-      [self = shared_from_this(), request](const std::shared_ptr<const SamlToken>& token,
-                                           const Tarnik::Exception* failure) {
-        self->ReceiveBase(request, token, failure);
+      [receive](const std::shared_ptr<const SamlToken>& token, const Tarnik::Exception* failure) {
+        receive({token, failure == nullptr ? Failure() : Failure::Copy(*failure)});
       });
 }
 
-void Core::ReceiveBase(const RequestPtr& request, const std::shared_ptr<const SamlToken>& token,
-                       const Tarnik::Exception* failure) noexcept {
+void Core::ReceiveBase(const RequestPtr& request, const Answer& answer) noexcept {
   Section section(*this);
   if (request->hasEnded) {
     return;
   }
-  if (failure != nullptr) {
-    Fail(section, request, Failure::Copy(*failure), runtime_->Now());
+  if (answer.failure.IsSet()) {
+    Fail(section, request, answer.failure, runtime_->Now());
     return;
   }
-  if (token == nullptr) {
+  if (answer.token == nullptr) {
     const Failure empty = Failure::Made([] {
       return Failure::Of(SsoException("The source of the token to exchange has returned none."));
     });
     Fail(section, request, empty.WithKind(FailureKind::kLocal), runtime_->Now());
     return;
   }
-  request->base = token;
+  request->base = answer.token;
   section.Start(request);
 }
 

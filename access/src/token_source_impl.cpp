@@ -79,6 +79,11 @@ void TokenSourceImpl::GetTokenAsync(const TokenSpec& spec, const CallContext& co
   Current().GetTokenAsync(spec, context, std::move(callback));
 }
 
+void TokenSourceImpl::GetAnswerAsync(const TokenSpec& spec, const CallContext& context,
+                                     AnswerCallback callback) {
+  Current().GetAnswerAsync(spec, context, std::move(callback));
+}
+
 void TokenSourceImpl::Invalidate(const SamlToken& token) {
   Current().Invalidate(token);
 }

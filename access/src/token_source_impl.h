@@ -29,6 +29,8 @@ class TokenSourceImpl final : public TokenSource {
   std::shared_ptr<const SamlToken> TryGetToken(const TokenSpec& spec) override;
   void GetTokenAsync(const TokenSpec& spec, const CallContext& context,
                      TokenCallback callback) override;
+  /// As `GetTokenAsync`, with the kind of a failure.
+  void GetAnswerAsync(const TokenSpec& spec, const CallContext& context, AnswerCallback callback);
   void Invalidate(const SamlToken& token) override;
   TokenSourceMetrics Metrics() const override;
   bool Stop(std::chrono::milliseconds wait) override;

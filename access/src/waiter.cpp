@@ -53,8 +53,7 @@ void CallbackCaller::Report() noexcept {
   isOwed_ = false;
   {
     const Activity::OwnThread scope(*activity_);
-    const auto failure = answer_.failure.IsSet() ? answer_.failure.ForCallback() : nullptr;
-    callback_(answer_.token, failure.get());
+    callback_(answer_);
     callback_ = nullptr;
     answer_ = {};
   }

@@ -2,6 +2,7 @@
 #define SSOCLIENT_ACCESS_WAITER_H
 
 #include <condition_variable>
+#include <functional>
 #include <memory>
 #include <mutex>
 #include <optional>
@@ -62,10 +63,13 @@ class BlockedCaller final : public Waiter {
   std::optional<Answer> answer_;
 };
 
+/// Receives the answer of a call, once.
+using AnswerCallback = std::function<void(const Answer&)>;
+
 /// A caller that is called back on a worker thread.
 class CallbackCaller final : public Waiter, public std::enable_shared_from_this<CallbackCaller> {
  public:
-  CallbackCaller(const CallContext& context, TokenSource::TokenCallback callback,
+  CallbackCaller(const CallContext& context, AnswerCallback callback,
                  std::shared_ptr<Runtime> runtime, std::shared_ptr<Activity> activity)
       : Waiter(context),
         callback_(std::move(callback)),
@@ -83,7 +87,7 @@ class CallbackCaller final : public Waiter, public std::enable_shared_from_this<
   void Schedule();
   void Report() noexcept;
 
-  TokenSource::TokenCallback callback_;
+  AnswerCallback callback_;
   const std::shared_ptr<Runtime> runtime_;
   const std::shared_ptr<Activity> activity_;
   Answer answer_;

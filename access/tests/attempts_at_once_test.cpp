@@ -267,6 +267,74 @@ TEST_F(AttemptsAtOnceTest, GateDoesNotHoldPlaces) {
             19);
 }
 
+TEST_F(AttemptsAtOnceTest, OneThatWaitsAtTheGateLeavesItsPlaceToTheOneThatHasTheGate) {
+  config.endpoints.resize(1);
+  config.retry.attemptsAtOnce = 1;
+  MakeAccepted();
+  std::shared_ptr<Reply> last;
+  bool isFirst = true;
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    if (std::exchange(isFirst, false)) {
+      // The second request waits for the place only, since logins are accepted. When they no longer
+      // are, the last one takes the gate, and waits for the place as well.
+      runtime->Settle();
+      runtime->Pass(seconds(11));
+      last = Ask(SpecFor("last"));
+      runtime->Settle();
+      return Fault();
+    }
+    return Issued(NewToken(hours(1)));
+  });
+  const auto first = Ask(SpecFor("first"));
+  const auto second = Ask(SpecFor("second"));
+  runtime->Settle();
+  EXPECT_TRUE(first->Is<SsoException>());
+  EXPECT_NE(second->token, nullptr);
+  EXPECT_NE(last->token, nullptr);
+}
+
+TEST_F(AttemptsAtOnceTest, PlaceOfOneThatLeavesBeforeItsAttemptIsGivenBack) {
+  config.endpoints.resize(1);
+  config.retry.attemptsAtOnce = 1;
+  MakeAccepted();
+  ForAll(Holds());
+  const CancellationSource cancellation;
+  // The second request has been given the place, and is about to run.
+  source->GetTokenAsync(spec, {}, [&](const auto&, const auto*) { cancellation.Cancel(); });
+  CallContext context;
+  context.cancellation = cancellation.Token();
+  const auto second = Ask(SpecFor("second"), context);
+  runtime->Settle();
+  EXPECT_TRUE(second->Is<Tarnik::CancelledException>());
+  EXPECT_EQ(Attempts(), 2U);
+  EXPECT_NE(Get(SpecFor("third")).token, nullptr);
+}
+
+TEST_F(AttemptsAtOnceTest, PlaceOfOneThatLeavesBeforeTheLoginsFunctionIsGivenBack) {
+  config.retry.attemptsAtOnce = 1;
+  bool isFirst = true;
+  config.login = PasswordLogin{"alice", [&] {
+                                 if (std::exchange(isFirst, false)) {
+                                   runtime->Settle();
+                                 }
+                                 return password;
+                               }};
+  Make();
+  const CancellationSource cancellation;
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    cancellation.Cancel();
+    return Issued(NewToken(hours(1)));
+  });
+  const auto first = Ask(spec);
+  CallContext context;
+  context.cancellation = cancellation.Token();
+  const auto second = Ask(SpecFor("second"), context);
+  runtime->Settle();
+  EXPECT_NE(first->token, nullptr);
+  EXPECT_TRUE(second->Is<Tarnik::CancelledException>());
+  EXPECT_NE(Get(SpecFor("third")).token, nullptr);
+}
+
 TEST_F(AttemptsAtOnceTest, CallsOfTheLoginsFunctionAreBoundedToo) {
   config.retry.attemptsAtOnce = 4;
   bool isSlow = true;

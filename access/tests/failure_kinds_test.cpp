@@ -95,6 +95,27 @@ TEST_F(FailureKindsTest, LoginsFunctionThatFailsInARefresh) {
   EXPECT_EQ(listener->Refreshes()[0].failure, FailureKind::kSecretFailed);
 }
 
+TEST_F(FailureKindsTest, FailureOfTheSourceOfATokenToExchangeKeepsItsKind) {
+  config.keepFresh = {spec};
+  ForAll(Fails(Unauthorised()));
+  const TokenSourceConfig outer = config;
+  config.keepFresh.clear();
+  config.listener = nullptr;
+  Make();
+  TokenLogin login;
+  login.source = source;
+  login.spec = SpecFor("https://base.example.com");
+  config = outer;
+  config.login = login;
+  config.holderOfKey = HolderOfKeyConfig{Tarnik::MakeRef<NamedCertificate>("own"), nullptr};
+  Make();
+  runtime->Settle();
+  ASSERT_EQ(listener->Refreshes().size(), 1U);
+  EXPECT_EQ(listener->Refreshes()[0].failure, FailureKind::kRefusedLogin);
+  EXPECT_EQ(Attempts(), 1U);
+  EXPECT_TRUE(Get(spec).Is<CommunicationException>());
+}
+
 TEST_F(FailureKindsTest, SummaryHasTheClassOfTheLastFailure) {
   config.retry.attempts = 2;
   scripts[0]->Set(Fails(Unreachable()));

@@ -35,10 +35,10 @@ class CallbackCallerTest : public ::testing::Test {
   std::shared_ptr<CallbackCaller> MakeCaller() {
     return std::make_shared<CallbackCaller>(
         CallContext(),
-        [this](const std::shared_ptr<const SamlToken>& token, const Tarnik::Exception* failure) {
+        [this](const Answer& answer) {
           ++calls;
-          id = token == nullptr ? "" : token->Id();
-          message = failure == nullptr ? "" : failure->Message();
+          id = answer.token == nullptr ? "" : answer.token->Id();
+          message = answer.failure.IsSet() ? answer.failure.ForCallback()->Message() : "";
           wasIdle = activity->WaitUntilIdle(std::chrono::milliseconds(0));
         },
         runtime, activity);
@@ -87,8 +87,7 @@ TEST_F(CallbackCallerTest, OrThrowsWithoutAWorkerAndNeverRuns) {
 TEST_F(CallbackCallerTest, WorkThatIsDroppedStillReports) {
   auto dropping = std::make_shared<Testing::VirtualRuntime>();
   auto caller = std::make_shared<CallbackCaller>(
-      CallContext(), [this](const auto&, const Tarnik::Exception*) { ++calls; }, dropping,
-      activity);
+      CallContext(), [this](const Answer&) { ++calls; }, dropping, activity);
   caller->Receive(SomeToken());
   caller.reset();
   EXPECT_EQ(calls, 0);
