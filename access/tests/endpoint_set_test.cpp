@@ -74,11 +74,11 @@ TEST_F(EndpointSetTest, ListedOrderBeginsAtTheFirstThatIsNotLeftOut) {
   constexpr auto kAsListed = EndpointSet::Order::kAsListed;
   const EndpointSet::Asked none(3);
   set.OnAnswer(2);
-  EXPECT_EQ(set.Admit(none, now, kAsListed).endpoint.value(), 0U);
+  EXPECT_EQ(set.TakePlace(none, now, kAsListed), 0U);
   FailOnce(0);
   FailOnce(0);
-  EXPECT_EQ(set.Admit(none, now, kAsListed).endpoint.value(), 1U);
-  EXPECT_EQ(set.Admit(none, now).endpoint.value(), 2U);
+  EXPECT_EQ(set.TakePlace(none, now, kAsListed), 1U);
+  EXPECT_EQ(set.TakePlace(none, now), 2U);
 }
 
 TEST_F(EndpointSetTest, OpenCircuitsAreLeftOut) {
