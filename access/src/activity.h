@@ -16,6 +16,8 @@ class Activity {
   /// Waits at most `limit` until nothing is left but what runs on this thread; false if the time
   /// was too short.
   bool WaitUntilIdle(std::chrono::milliseconds limit);
+  /// Whether something that has begun runs on this thread.
+  bool IsRunningHere() const noexcept { return CountOnThisThread() > 0; }
 
   /// Marks what has begun as running on this thread.
   class OwnThread {

@@ -66,6 +66,8 @@ class Core : public std::enable_shared_from_this<Core> {
   void Invalidate(const SamlToken& token);
   TokenSourceMetrics Metrics() const;
   bool Stop(std::chrono::milliseconds wait);
+  /// Whether this thread is in a function of the login, the listener or a callback.
+  bool IsRunningHere() const noexcept { return activity_->IsRunningHere(); }
   /// Ends all calls, since the process ends. Waits a moment for the callbacks.
   void EndProcess() noexcept;
 
@@ -166,6 +168,7 @@ class Core : public std::enable_shared_from_this<Core> {
   void ArmTimer(Section& section, Instant::Steady earliest = Instant::Steady::min()) noexcept;
   bool IsPinned(const KeyPtr& key) noexcept;
 
+  // Destroyed last.
   const std::shared_ptr<const TokenSourceConfig> config_;
   const std::shared_ptr<Runtime> runtime_;
   const std::shared_ptr<Activity> activity_;

@@ -1,6 +1,10 @@
 #include "token_source_impl.h"
 
+#include <chrono>
+#include <future>
 #include <utility>
+
+#include <tarnik/system/thread_pool.h>
 
 #include "config_check.h"
 #include "process_hooks.h"
@@ -10,9 +14,22 @@ namespace SsoClient::Access {
 struct TokenSourceImpl::Process {
   std::uint64_t generation;
   std::shared_ptr<Core> core;
+  std::future<void> end;  // ready when nothing of the core is left that belongs to the user
 };
 
 namespace {
+
+constexpr std::chrono::seconds kEndLimit{1};
+
+// The core releases its configuration last.
+std::future<void> WatchEnd(std::shared_ptr<const TokenSourceConfig>& config) {
+  const auto end = std::make_shared<std::promise<void>>();
+  config = {config.get(), [config, end](const TokenSourceConfig*) mutable {
+              config.reset();
+              end->set_value();
+            }};
+  return end->get_future();
+}
 
 std::shared_ptr<Core> MakeCore(Core::Parts parts) {
   auto core = Core::Create(std::move(parts));
@@ -38,15 +55,24 @@ TokenSourceImpl::TokenSourceImpl(MakeParts makeParts)
     : makeParts_(std::move(makeParts)), process_(MakeProcess()) {}
 
 TokenSourceImpl::~TokenSourceImpl() {
-  Process* const process = process_.load(std::memory_order_acquire);
-  if (process->generation == ForkGeneration()) {
-    process->core->Stop(std::chrono::seconds(1));
-    delete process;
+  if (process_.load(std::memory_order_acquire)->generation != ForkGeneration()) {
+    return;
+  }
+  const std::unique_ptr<Process> process(process_.load(std::memory_order_acquire));
+  const bool isIdle = process->core->Stop(kEndLimit) && !process->core->IsRunningHere() &&
+                      !Tarnik::System::IsProcessEnding();
+  process->core.reset();
+  if (isIdle) {
+    // A worker may have the core for a moment more. The user's functions must not be destroyed
+    // later, since their code may be that of a plug-in.
+    process->end.wait_for(kEndLimit);
   }
 }
 
 TokenSourceImpl::Process* TokenSourceImpl::MakeProcess() const {
-  return new Process{ForkGeneration(), MakeCore(makeParts_())};
+  Core::Parts parts = makeParts_();
+  std::future<void> end = WatchEnd(parts.config);
+  return new Process{ForkGeneration(), MakeCore(std::move(parts)), std::move(end)};
 }
 
 Core& TokenSourceImpl::Current() const {

@@ -1,6 +1,11 @@
 #include "token_source_impl.h"
 
+#include <atomic>
+#include <functional>
+#include <memory>
 #include <thread>
+#include <utility>
+#include <vector>
 
 #include <gtest/gtest.h>
 #include <sys/wait.h>
@@ -115,6 +120,57 @@ TEST_F(TokenSourceImplTest, DestructionStopsTheSource) {
   EXPECT_TRUE(reply->Is<Tarnik::InvalidStateException>());
   EXPECT_EQ(reply->calls, 1);
   EXPECT_EQ(Attempts(), 1U);
+}
+
+/// Runs work on threads of its own, which keep it for a moment after it has run.
+class LingeringRuntime final : public Runtime {
+ public:
+  ~LingeringRuntime() override {
+    for (std::thread& thread : threads_) {
+      thread.join();
+    }
+  }
+
+  Instant Now() const override { return Instant::Now(); }
+  double Draw() override { return 0.5; }
+  void Run(std::function<void()> work) override {
+    threads_.emplace_back([this, work = std::move(work)]() mutable {
+      work();
+      isReleased_.wait(false);
+      std::this_thread::sleep_for(milliseconds(20));
+      work = nullptr;
+    });
+  }
+  Tarnik::Ref<Tarnik::System::CancellableItem> RunAt(Instant::Steady,
+                                                     std::function<void()>) override {
+    return nullptr;
+  }
+  void Release() {
+    isReleased_ = true;
+    isReleased_.notify_all();
+  }
+
+ private:
+  std::vector<std::thread> threads_;
+  std::atomic<bool> isReleased_{false};
+};
+
+// Their code may be that of a plug-in, which is unloaded next.
+TEST_F(TokenSourceImplTest, NothingOfTheUserIsLeftAfterTheDestruction) {
+  const auto lingering = std::make_shared<LingeringRuntime>();
+  auto kept = std::make_shared<const TokenSourceConfig>(config);
+  const std::weak_ptr<const TokenSourceConfig> left = kept;
+  ForAll(Issues(hours(1)));
+  auto own = std::make_unique<TokenSourceImpl>(
+      [lingering, script = scripts[0], kept = std::exchange(kept, nullptr)] {
+        Core::Parts parts{kept, lingering, {}};
+        parts.clients.push_back(std::make_unique<ScriptedEndpoint>(kept->endpoints[0], script));
+        return parts;
+      });
+  EXPECT_NE(own->GetToken(spec, {}), nullptr);
+  lingering->Release();
+  own.reset();
+  EXPECT_TRUE(left.expired());
 }
 
 }  // namespace

@@ -1,5 +1,6 @@
 #include "end_to_end/end_to_end_fixture.h"
 
+#include <algorithm>
 #include <chrono>
 #include <thread>
 
@@ -82,7 +83,19 @@ DevSts::Misbehavior Refusing(const std::string& faultCode) {
 
 std::vector<AttemptRecord> EndToEndTest::AwaitEnded(std::size_t count) const {
   EXPECT_TRUE(listener_->Await([&](const Records& seen) { return seen.ended.size() >= count; }));
-  return listener_->Seen().ended;
+  auto attempts = listener_->Seen().ended;
+  std::sort(attempts.begin(), attempts.end(),
+            [](const AttemptRecord& a, const AttemptRecord& b) { return a.id < b.id; });
+  return attempts;
+}
+
+bool EndToEndTest::AwaitCircuit(const std::string& endpoint, CircuitState state) const {
+  return listener_->Await([&](const Records& seen) {
+    return std::any_of(seen.circuits.begin(), seen.circuits.end(),
+                       [&](const CircuitRecord& circuit) {
+                         return circuit.endpoint == endpoint && circuit.state == state;
+                       });
+  });
 }
 
 std::size_t RequestsOf(std::initializer_list<const DevSts::Server*> servers) {

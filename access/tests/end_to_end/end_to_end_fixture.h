@@ -61,8 +61,10 @@ class EndToEndTest : public testing::Test {
     return CreateTokenSource(std::move(config));
   }
   /// Waits for the ends of so many attempts, which are reported after the callers have their
-  /// answer, and returns all.
+  /// answer, and returns all in the order in which they began.
   std::vector<AttemptRecord> AwaitEnded(std::size_t count) const;
+  /// Waits until the circuit of an endpoint is reported to be in this state.
+  bool AwaitCircuit(const std::string& endpoint, CircuitState state) const;
 
   const std::shared_ptr<AwaitingListener> listener_ = std::make_shared<AwaitingListener>();
 };

@@ -180,13 +180,10 @@ TEST_F(RefreshAsyncTest, WhileAllEndpointsAreDownTheTokenIsServed) {
   const auto next = AwaitOther(*source, spec_, *token);
   ASSERT_NE(next, nullptr);
   EXPECT_FALSE(HasEnded(*token));
-  const auto circuits = listener_->Seen().circuits;
-  ASSERT_FALSE(circuits.empty());
-  EXPECT_EQ(circuits.back().endpoint, sts_.HttpsUrl());
-  EXPECT_EQ(circuits.back().state, CircuitState::kClosed);
-  const auto failures = listener_->Seen().refreshFailures.size();
+  EXPECT_TRUE(AwaitCircuit(sts_.HttpsUrl(), CircuitState::kClosed));
+  const auto failures = source->Metrics().refreshFailures;
   ASSERT_NE(Get(*source, SpecFor(1)).token, nullptr);
-  EXPECT_EQ(listener_->Seen().refreshFailures.size(), failures);
+  EXPECT_EQ(source->Metrics().refreshFailures, failures);
 }
 
 TEST_F(RefreshAsyncTest, ATokenToKeepFreshIsThereBeforeTheFirstCall) {

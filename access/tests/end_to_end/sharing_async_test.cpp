@@ -15,7 +15,7 @@ namespace {
 
 using namespace std::chrono_literals;
 
-constexpr std::size_t kAsyncCallers = 5000;
+constexpr std::size_t kAsyncCallers = 3000;
 constexpr std::size_t kBlockedCallers = 32;
 
 class SharingAsyncTest : public EndToEndTest {

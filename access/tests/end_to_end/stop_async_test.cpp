@@ -135,5 +135,34 @@ TEST_F(StopAsyncTest, RefreshesUnderWayEnd) {
   ExpectStopped();
 }
 
+// Their code may be that of a plug-in, which is unloaded next.
+TEST_F(StopAsyncTest, NothingOfTheUserIsLeftAfterTheDestructor) {
+  sts_.ClearMisbehavior();
+  for (int i = 0; i < 30; ++i) {
+    std::weak_ptr<int> left;
+    std::weak_ptr<AwaitingListener> leftListener;
+    {
+      const auto kept = std::make_shared<int>(0);
+      left = kept;
+      TokenSourceConfig config = Trusting({&sts_});
+      config.endpoints = {{sts_.HttpUrl(), ""}};
+      config.login = PasswordLogin{kUser, [kept] { return std::string(kPassword); }};
+      config.refresh.fraction = 0.0001;
+      config.refresh.jitter = 0;
+      config.keepFresh = {SpecFor(0), SpecFor(1)};
+      config.listener = std::make_shared<AwaitingListener>();
+      leftListener = std::static_pointer_cast<AwaitingListener>(config.listener);
+      source_ = CreateTokenSource(std::move(config));
+    }
+    EXPECT_NE(Get(*source_, SpecFor(0)).token, nullptr);
+    for (std::size_t call = 0; call < 20; ++call) {
+      calls_.Begin(*source_, SpecFor(call));
+    }
+    source_.reset();
+    ASSERT_TRUE(left.expired()) << "round " << i;
+    ASSERT_TRUE(leftListener.expired()) << "round " << i;
+  }
+}
+
 }  // namespace
 }  // namespace SsoClient::Access::Testing

@@ -161,7 +161,9 @@ struct TokenSourceMetrics {
 ///
 /// A source may be used in a forked child, where it begins with an empty cache. When the process
 /// ends, calls end as those of `SecurityTokenService` do. Destroying a source stops it; the last
-/// reference may be released anywhere, in a callback too.
+/// reference may be released anywhere, in a callback too. When it is released elsewhere after
+/// `Stop` has returned true, nothing of the configuration is left, so that the plug-in whose
+/// functions it contained may be unloaded.
 ///
 /// A program may implement this class itself, for its tests for example. The order of the
 /// operations is part of the binary interface, and later versions add none.
