@@ -25,7 +25,7 @@ Core::Parts MakeSystemParts(const std::shared_ptr<const TokenSourceConfig>& conf
   parts.config = config;
   parts.runtime = CreateSystemRuntime();
   for (const Endpoint& endpoint : config->endpoints) {
-    parts.clients.push_back(CreateEndpointClient(*config, endpoint));
+    parts.clients.push_back(CreateEndpointClient(config, endpoint));
   }
   return parts;
 }
