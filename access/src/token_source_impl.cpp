@@ -94,6 +94,7 @@ bool TokenSourceImpl::Stop(std::chrono::milliseconds wait) {
 
 std::shared_ptr<TokenSource> CreateTokenSource(TokenSourceConfig config) {
   CheckConfig(config);
+  LimitDurations(config);
   const auto shared = std::make_shared<const TokenSourceConfig>(std::move(config));
   return std::make_shared<TokenSourceImpl>([shared] { return MakeSystemParts(shared); });
 }
