@@ -2,12 +2,11 @@
 
 #include <algorithm>
 
+#include "instant.h"
+
 namespace SsoClient::Access {
 
 namespace {
-
-// Thirty years, which the clock can represent.
-constexpr std::chrono::milliseconds kLongestWait = std::chrono::hours(24 * 365 * 30);
 
 thread_local const Activity::OwnThread* innermost = nullptr;
 
@@ -45,8 +44,9 @@ void Activity::End() noexcept {
 bool Activity::WaitUntilIdle(std::chrono::milliseconds limit) {
   const int own = CountOnThisThread();
   std::unique_lock lock(mutex_);
-  return ended_.wait_for(lock, std::min(limit, kLongestWait),
-                         [this, own] { return count_ <= own; });
+  const auto wait =
+      std::clamp<std::chrono::milliseconds>(limit, std::chrono::milliseconds(0), kLongestDuration);
+  return ended_.wait_for(lock, wait, [this, own] { return count_ <= own; });
 }
 
 }  // namespace SsoClient::Access

@@ -14,7 +14,7 @@ class Activity {
   void Begin() noexcept;
   void End() noexcept;
   /// Waits at most `limit` until nothing is left but what runs on this thread; false if the time
-  /// was too short.
+  /// was too short. A negative limit is zero.
   bool WaitUntilIdle(std::chrono::milliseconds limit);
   /// Whether something that has begun runs on this thread.
   bool IsRunningHere() const noexcept { return CountOnThisThread() > 0; }

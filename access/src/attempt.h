@@ -55,8 +55,8 @@ class EndpointClient {
 
 /// A client of `endpoint` over the client library, with kept connections. Throws
 /// `Tarnik::InvalidArgumentException` as `CreateTokenSource` does.
-std::unique_ptr<EndpointClient> CreateEndpointClient(const TokenSourceConfig& config,
-                                                     const Endpoint& endpoint);
+std::unique_ptr<EndpointClient> CreateEndpointClient(
+    const std::shared_ptr<const TokenSourceConfig>& config, const Endpoint& endpoint);
 
 }  // namespace SsoClient::Access
 

@@ -1,13 +1,34 @@
 #include "cache_key.h"
 
+#include <chrono>
+#include <cstdint>
+#include <exception>
 #include <functional>
 #include <string_view>
 
 #include <ssoclient/saml_token.h>
 
+#include "secret.h"
+
 namespace SsoClient::Access {
 
 namespace {
+
+// Random in each process, so that who chooses an audience or an advice cannot choose its hash.
+SecretTagger MakeTagger() noexcept {
+  try {
+    return SecretTagger();
+  } catch (const std::exception&) {
+    // No random numbers: the next best that nobody outside knows.
+    const auto now = std::chrono::steady_clock::now().time_since_epoch().count();
+    return SecretTagger({static_cast<std::uint64_t>(now), std::hash<const void*>()(&now)});
+  }
+}
+
+std::uint64_t TagOf(std::string_view text) noexcept {
+  static const SecretTagger tagger = MakeTagger();
+  return tagger.TagOf(text);
+}
 
 class Hasher {
  public:
@@ -15,7 +36,7 @@ class Hasher {
     // 2^64 divided by the golden ratio spreads neighbouring values.
     state_ ^= value + 0x9e3779b97f4a7c15U + (state_ << 6) + (state_ >> 2);
   }
-  void Add(std::string_view text) noexcept { Add(std::hash<std::string_view>()(text)); }
+  void Add(std::string_view text) noexcept { Add(std::size_t{TagOf(text)}); }
   std::size_t Result() const noexcept { return state_; }
 
  private:

@@ -8,7 +8,9 @@
 
 namespace SsoClient::Access {
 
-/// A hash of every field of `spec`; of the act-as token, its id. Does not allocate.
+/// A hash of every field of `spec`; of the act-as token, its id. It differs from process to
+/// process, and who does not know the key of the process finds no specs with equal hashes. Does not
+/// allocate.
 std::size_t HashOf(const TokenSpec& spec) noexcept;
 
 /// True when both ask for the same token. Act-as tokens are equal when their texts are.

@@ -1,6 +1,7 @@
 #include <atomic>
 #include <condition_variable>
 #include <map>
+#include <memory>
 #include <mutex>
 #include <thread>
 #include <utility>
@@ -8,21 +9,26 @@
 #include <ssoclient/access/call_context.h>
 #include <tarnik/core/exception.h>
 
+#include "process_hooks.h"
+
 namespace SsoClient::Access {
 
-class CancellationState {
+/// The functions that are registered in one process.
+class CancellationActions {
  public:
   using Id = std::uint64_t;
 
-  bool IsCancelled() const noexcept { return isCancelled_.load(std::memory_order_acquire); }
+  explicit CancellationActions(const CancellationActions* ofParent)
+      : generation_(ForkGeneration()), ofParent_(ofParent) {}
 
-  /// False if the state is cancelled, and `action` must run now.
-  bool Add(std::function<void()>& action, Id& id) {
+  bool AreOfThisProcess() const noexcept { return generation_ == ForkGeneration(); }
+
+  /// False if `isCancelled`, and `action` must run now.
+  bool Add(std::function<void()>& action, Id id, const std::atomic<bool>& isCancelled) {
     const std::lock_guard lock(mutex_);
-    if (IsCancelled()) {
+    if (isCancelled) {
       return false;
     }
-    id = ++lastId_;
     actions_.emplace(id, std::move(action));
     return true;
   }
@@ -36,11 +42,8 @@ class CancellationState {
     }
   }
 
-  void Cancel() noexcept {
+  void RunAll() noexcept {
     std::unique_lock lock(mutex_);
-    if (isCancelled_.exchange(true, std::memory_order_acq_rel)) {
-      return;
-    }
     canceller_ = std::this_thread::get_id();
     while (!actions_.empty()) {
       auto action = actions_.extract(actions_.begin());
@@ -58,13 +61,77 @@ class CancellationState {
  private:
   using Actions = std::map<Id, std::function<void()>>;
 
-  std::atomic<bool> isCancelled_{false};
+  const std::uint64_t generation_;
+  /// Unused, so that leak checkers find it.
+  [[maybe_unused]] const CancellationActions* const ofParent_;
   std::mutex mutex_;
   std::condition_variable actionHasRun_;
   Actions actions_;
-  Id lastId_ = 0;
   Id running_ = 0;
   std::thread::id canceller_;
+};
+
+/// What the copies of a source and its tokens share. The functions that a parent process has
+/// registered are never touched in a forked child, where a thread that does not exist may hold
+/// their lock, and where they would work on the calls of the parent.
+class CancellationState {
+ public:
+  using Id = CancellationActions::Id;
+
+  CancellationState() : actions_(new CancellationActions(nullptr)) {}
+  ~CancellationState() {
+    if (const CancellationActions* const own = Own()) {
+      delete own;
+    }
+  }
+  CancellationState(const CancellationState&) = delete;
+  CancellationState& operator=(const CancellationState&) = delete;
+
+  bool IsCancelled() const noexcept { return isCancelled_.load(std::memory_order_acquire); }
+
+  /// False if the state is cancelled, and `action` must run now.
+  bool Add(std::function<void()>& action, Id& id) {
+    id = ++lastId_;
+    return OwnOrNew().Add(action, id, isCancelled_);
+  }
+
+  void Remove(Id id) {
+    if (CancellationActions* const own = Own()) {
+      own->Remove(id);
+    }
+  }
+
+  // In a child without functions, one that is being registered sees the flag: the functions are
+  // published before it is read, and it is set before they are looked for.
+  void Cancel() noexcept {
+    if (isCancelled_.exchange(true)) {
+      return;
+    }
+    if (CancellationActions* const own = Own()) {
+      own->RunAll();
+    }
+  }
+
+ private:
+  /// Null in a child that has registered nothing.
+  CancellationActions* Own() const noexcept {
+    CancellationActions* const known = actions_.load();
+    return known->AreOfThisProcess() ? known : nullptr;
+  }
+
+  CancellationActions& OwnOrNew() {
+    CancellationActions* known = actions_.load();
+    if (known->AreOfThisProcess()) {
+      return *known;
+    }
+    auto made = std::make_unique<CancellationActions>(known);
+    return actions_.compare_exchange_strong(known, made.get()) ? *made.release() : *known;
+  }
+
+  std::atomic<bool> isCancelled_{false};
+  std::atomic<CancellationActions*> actions_;
+  /// Goes on in a child, so that what a parent has registered there removes nothing.
+  std::atomic<Id> lastId_{0};
 };
 
 CancellationRegistration::CancellationRegistration(std::shared_ptr<CancellationState> state,
@@ -113,7 +180,9 @@ CancellationRegistration CancellationToken::OnCancel(std::function<void()> actio
 CancellationSource::CancellationSource() : token_(std::make_shared<CancellationState>()) {}
 
 void CancellationSource::Cancel() const noexcept {
-  token_.state_->Cancel();
+  // A function that it runs may destroy this object.
+  const auto state = token_.state_;
+  state->Cancel();
 }
 
 }  // namespace SsoClient::Access

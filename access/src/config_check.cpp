@@ -1,9 +1,15 @@
 #include "config_check.h"
 
+#include <algorithm>
 #include <string>
 #include <variant>
+#include <vector>
 
 #include <tarnik/core/exception.h>
+#include <tarnik/http/http_url.h>
+#include <tarnik/xml/character_nodes.h>
+
+#include "instant.h"
 
 namespace SsoClient::Access {
 
@@ -64,6 +70,30 @@ void CheckRetry(const RetryConfig& retry) {
           "The time for which a refused login is remembered is negative.");
 }
 
+bool IsHttps(const Endpoint& endpoint) {
+  bool isHttps = false;
+  std::string host;
+  int port = 0;
+  std::string path;
+  Tarnik::Http::ParseHttpURL(endpoint.url, isHttps, host, port, path);
+  return isHttps;
+}
+
+// Otherwise a peer that is not trusted would cause a failover to plain text.
+void CheckSchemes(const std::vector<Endpoint>& endpoints) {
+  const bool isHttps = IsHttps(endpoints.front());
+  for (const Endpoint& endpoint : endpoints) {
+    Require(IsHttps(endpoint) == isHttps,
+            "Some endpoints are https URLs and others http URLs: a failure of TLS would send the "
+            "login in plain text.");
+  }
+}
+
+template <class Duration>
+void Limit(Duration& duration) noexcept {
+  duration = std::min(duration, std::chrono::duration_cast<Duration>(kLongestDuration));
+}
+
 }  // namespace
 
 void CheckConfig(const TokenSourceConfig& config) {
@@ -77,6 +107,36 @@ void CheckConfig(const TokenSourceConfig& config) {
           "More tokens are to be kept fresh than the cache has room for.");
   for (const TokenSpec& spec : config.keepFresh) {
     CheckSpec(spec, config.login);
+    CheckTexts(spec);
+  }
+  CheckSchemes(config.endpoints);
+}
+
+void LimitDurations(TokenSourceConfig& config) noexcept {
+  Limit(config.refresh.longestMargin);
+  Limit(config.retry.firstDelay);
+  Limit(config.retry.longestDelay);
+  Limit(config.retry.longestRetryAfter);
+  Limit(config.retry.refusalMemory);
+}
+
+void CheckTexts(const TokenSpec& spec) {
+  Tarnik::Ref<Tarnik::Xml::TextNode> node;
+  Tarnik::Xml::CreateTextNode(node);
+  for (const std::string& audience : spec.audienceRestriction) {
+    node->SetText(audience);
+  }
+  if (spec.delegateTo) {
+    node->SetText(*spec.delegateTo);
+  }
+  for (const Advice& advice : spec.advice) {
+    node->SetText(advice.source);
+    for (const AdviceAttribute& attribute : advice.attributes) {
+      node->SetText(attribute.name);
+      for (const std::string& value : attribute.values) {
+        node->SetText(value);
+      }
+    }
   }
 }
 

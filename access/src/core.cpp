@@ -15,8 +15,6 @@ namespace SsoClient::Access {
 
 namespace {
 
-constexpr std::chrono::milliseconds kExitLimit{200};
-
 Failure StoppedFailure() {
   return Failure::Of(Tarnik::InvalidStateException("The token source has been stopped."));
 }
@@ -34,6 +32,11 @@ Failure TooShortFailure(std::chrono::microseconds granted, std::chrono::seconds 
   return Failure::Of(SsoException("The service grants " + std::to_string(seconds.count()) +
                                   " s, but the caller needs a token for " +
                                   std::to_string(minimumLife.count()) + " s."));
+}
+
+// Beside those that are never evicted, there is room for one.
+std::size_t CapacityFor(const TokenSourceConfig& config) {
+  return std::max(config.cache.capacity, config.keepFresh.size() + 1);
 }
 
 // The exchange under way of a request that waits for an attempt.
@@ -57,7 +60,7 @@ Core::Core(Parts parts)
       processEnding_(ProcessEndFailure()),
       refused_(Failure::Of(InvalidCredentialsException("The service has refused the login."))),
       expired_(Failure::Of(PasswordExpiredException("The password has expired."))),
-      cache_(config_->cache.capacity),
+      cache_(CapacityFor(*config_)),
       endpoints_(config_->retry, std::move(parts.clients)),
       gate_(config_->retry.refusalMemory) {}
 
@@ -92,7 +95,9 @@ TokenCache::Hit Core::FindHit(const TokenSpec& spec, const CallContext& context)
   CheckContext(context, now);
   CheckSpec(spec, config_->login);
   TokenCache::Hit hit = cache_.Find(SpecView(spec), now, context.minimumLife);
-  if (hit.wantsRefresh) {
+  if (hit.token == nullptr) {
+    CheckTexts(spec);
+  } else if (hit.wantsRefresh) {
     RefreshLate(spec);
   }
   return hit;
@@ -157,10 +162,33 @@ void Core::RefreshLate(const TokenSpec& spec) noexcept {
 }
 
 void Core::Wait(const TokenSpec& spec, const WaiterPtr& waiter) {
-  RequestPtr begun;
+  // A callback may release the last reference before this returns.
+  const auto self = shared_from_this();
+  const CancellationToken& token = waiter->Context().cancellation;
+  // Before the waiter joins, its function does nothing.
+  waiter->cancellation = token.OnCancel([core = weak_from_this(), weak = std::weak_ptr(waiter)] {
+    const auto cancelled = core.lock();
+    const auto left = weak.lock();
+    if (cancelled != nullptr && left != nullptr) {
+      cancelled->Leave(left, Leaving::kCancelled);
+    }
+  });
+  Joined joined = TryJoin(spec, waiter);
+  if (joined.begun != nullptr) {
+    RunBegun(joined.begun, waiter);
+  }
+  if (!joined.answer && token.IsCancelled() && Withdraw(waiter)) {
+    joined.answer = Answer{nullptr, CancelledFailure()};
+  }
+  if (joined.answer) {
+    waiter->ReceiveOrThrow(std::move(*joined.answer));
+  }
+}
+
+Core::Joined Core::TryJoin(const TokenSpec& spec, const WaiterPtr& waiter) {
   try {
     Section section(*this);
-    begun = Join(section, spec, waiter);
+    return Join(section, spec, waiter);
   } catch (...) {
     // The waiter is not known to a request.
     if (const auto timer = std::exchange(waiter->deadlineTimer, nullptr)) {
@@ -168,41 +196,28 @@ void Core::Wait(const TokenSpec& spec, const WaiterPtr& waiter) {
     }
     throw;
   }
-  bool isRunning = false;
+}
+
+// Throws if the waiter, which has begun the request, was still waiting.
+void Core::RunBegun(const RequestPtr& begun, const WaiterPtr& waiter) {
   try {
-    if (begun != nullptr) {
-      Run(begun);
-    }
-    isRunning = true;
-    const CancellationToken& token = waiter->Context().cancellation;
-    waiter->cancellation = token.OnCancel([core = weak_from_this(), weak = std::weak_ptr(waiter)] {
-      const auto self = core.lock();
-      const auto left = weak.lock();
-      if (self != nullptr && left != nullptr) {
-        self->Leave(left, Leaving::kCancelled);
-      }
-    });
+    Run(begun);
   } catch (...) {
     const bool wasWaiting = Withdraw(waiter);
-    if (begun != nullptr && !isRunning) {
-      FailHere(begun, Failure::Current());  // for those who have joined
-    }
+    FailHere(begun, Failure::Current());  // for those who have joined
     if (wasWaiting) {
       throw;
     }
   }
 }
 
-// Returns the request if it is new and must be run.
-RequestPtr Core::Join(Section& section, const TokenSpec& spec, const WaiterPtr& waiter) {
+Core::Joined Core::Join(Section& section, const TokenSpec& spec, const WaiterPtr& waiter) {
   if (state_ != State::kRunning) {
-    section.GiveAnswer(waiter, {nullptr, state_ == State::kStopped ? stopped_ : processEnding_});
-    return nullptr;
+    return {nullptr, Answer{nullptr, state_ == State::kStopped ? stopped_ : processEnding_}};
   }
   const SpecView view(spec);
   if (auto answer = AnswerAtOnce(view, waiter, runtime_->Now())) {
-    section.GiveAnswer(waiter, std::move(*answer));
-    return nullptr;
+    return {nullptr, std::move(answer)};
   }
   if (waiter->Context().deadline != CallContext::Clock::time_point::max()) {
     waiter->deadlineTimer = runtime_->RunAt(
@@ -230,7 +245,7 @@ RequestPtr Core::Join(Section& section, const TokenSpec& spec, const WaiterPtr& 
   waiter->hasJoined = !isNew;
   ++waiting_;
   (isNew ? counters_.misses : counters_.shared).Add();
-  return isNew ? request : nullptr;
+  return {isNew ? request : nullptr, boost::none};
 }
 
 boost::optional<Answer> Core::AnswerAtOnce(const SpecView& spec, const WaiterPtr& waiter,
@@ -241,7 +256,7 @@ boost::optional<Answer> Core::AnswerAtOnce(const SpecView& spec, const WaiterPtr
     return Answer{std::move(hit.token), {}};
   }
   const EntryPtr entry = cache_.Peek(spec);
-  if (entry != nullptr && !entry->Life().HasEnded(now) && entry->Life().granted < minimumLife) {
+  if (entry != nullptr && !entry->Life().HasEnded(now) && !entry->Life().IsGranted(minimumLife)) {
     return Answer{nullptr, TooShortFailure(entry->Life().granted, minimumLife)};
   }
   return boost::none;
@@ -333,6 +348,7 @@ void Core::GiveAll(Section& section, const RequestPtr& request, const CacheEntry
 }
 
 void Core::Invalidate(const SamlToken& token) {
+  const auto self = shared_from_this();  // as in `Wait`
   Section section(*this);
   EntryPtr refused;
   cache_.ForEach([&](const EntryPtr& entry) {
@@ -371,6 +387,7 @@ TokenSourceMetrics Core::Metrics() const {
 }
 
 bool Core::Stop(std::chrono::milliseconds wait) {
+  const auto self = shared_from_this();  // as in `Wait`
   EndAll(State::kStopped, stopped_);
   // The pool runs nothing more then.
   const bool isPoolStopped = Tarnik::System::IsProcessEnding();
@@ -379,8 +396,12 @@ bool Core::Stop(std::chrono::milliseconds wait) {
 
 void Core::EndProcess() noexcept {
   EndAll(State::kProcessEnding, processEnding_);
+}
+
+void Core::WaitUntil(Instant::Steady time) noexcept {
   try {
-    activity_->WaitUntilIdle(kExitLimit);
+    const auto left = time - std::chrono::steady_clock::now();
+    activity_->WaitUntilIdle(std::chrono::ceil<std::chrono::milliseconds>(left));
   } catch (...) {
     // The pool ends what is under way.
   }

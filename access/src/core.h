@@ -68,14 +68,21 @@ class Core : public std::enable_shared_from_this<Core> {
   bool Stop(std::chrono::milliseconds wait);
   /// Whether this thread is in a function of the login, the listener or a callback.
   bool IsRunningHere() const noexcept { return activity_->IsRunningHere(); }
-  /// Ends all calls, since the process ends. Waits a moment for the callbacks.
+  /// Ends all calls, since the process ends. Does not wait.
   void EndProcess() noexcept;
+  /// Waits until no function of the user is running, at most until `time`.
+  void WaitUntil(Instant::Steady time) noexcept;
 
  private:
   friend class Section;
 
   enum class State { kRunning, kStopped, kProcessEnding };
   enum class Leaving { kDeadline, kCancelled };
+  /// What becomes of a waiter: it has an answer at once, or waits for a request.
+  struct Joined {
+    RequestPtr begun;  ///< the request if it is new and must be run
+    boost::optional<Answer> answer;
+  };
 
   // calls: core.cpp
   void RequireRunning() const;
@@ -83,7 +90,9 @@ class Core : public std::enable_shared_from_this<Core> {
   TokenCache::Hit FindHit(const TokenSpec& spec, const CallContext& context);
   void RefreshLate(const TokenSpec& spec) noexcept;
   void Wait(const TokenSpec& spec, const WaiterPtr& waiter);
-  RequestPtr Join(Section& section, const TokenSpec& spec, const WaiterPtr& waiter);
+  Joined TryJoin(const TokenSpec& spec, const WaiterPtr& waiter);
+  Joined Join(Section& section, const TokenSpec& spec, const WaiterPtr& waiter);
+  void RunBegun(const RequestPtr& begun, const WaiterPtr& waiter);
   boost::optional<Answer> AnswerAtOnce(const SpecView& spec, const WaiterPtr& waiter,
                                        const Instant& now);
   bool Withdraw(const WaiterPtr& waiter) noexcept;

@@ -1,6 +1,7 @@
 #include "process_hooks.h"
 
 #include <atomic>
+#include <chrono>
 #include <cstdlib>
 #include <mutex>
 #include <utility>
@@ -13,6 +14,9 @@
 namespace SsoClient::Access {
 
 namespace {
+
+// For the callbacks of all sources together.
+constexpr std::chrono::milliseconds kExitLimit{200};
 
 // Never destroyed. A forked child makes a new one, since a thread that the child does not have may
 // hold the lock of this one.
@@ -51,6 +55,15 @@ Registry& OwnRegistry() {
   return *current;
 }
 
+template <class Action>
+void ForAll(const std::vector<std::weak_ptr<Core>>& cores, const Action& action) noexcept {
+  for (const auto& weak : cores) {
+    if (const auto core = weak.lock()) {
+      action(*core);
+    }
+  }
+}
+
 }  // namespace
 
 std::uint64_t ForkGeneration() noexcept {
@@ -81,11 +94,9 @@ void EndCoresOfProcess() noexcept {
     const std::lock_guard lock(own->mutex);
     cores.swap(own->cores);
   }
-  for (const auto& weak : cores) {
-    if (const auto core = weak.lock()) {
-      core->EndProcess();
-    }
-  }
+  ForAll(cores, [](Core& core) { core.EndProcess(); });
+  const Instant::Steady end = std::chrono::steady_clock::now() + kExitLimit;
+  ForAll(cores, [end](Core& core) { core.WaitUntil(end); });
 }
 
 }  // namespace SsoClient::Access

@@ -18,7 +18,7 @@ void RegisterCore(const std::shared_ptr<Core>& core);
 /// pool, since it needs worker threads for callbacks: called when the pool has been started.
 void WatchProcessEnd() noexcept;
 
-/// What the handler does.
+/// What the handler does: ends the calls of all sources, and waits a moment for their callbacks.
 void EndCoresOfProcess() noexcept;
 
 }  // namespace SsoClient::Access

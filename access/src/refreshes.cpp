@@ -14,7 +14,10 @@ using std::chrono::milliseconds;
 
 // Refreshes must not take the threads that callers need.
 constexpr std::size_t kMaxBackgroundRequests = 8;
+// Each is then due later, or is no longer due; the timer fires again for the rest.
+constexpr std::size_t kKeysAtOnce = 64;
 constexpr std::chrono::seconds kNextLook{1};
+constexpr std::chrono::minutes kLookAfterEnd{10};
 
 // When the act-as token of a spec ends, nothing may be requested with it any more.
 bool HasActAsEnded(const TokenSpec& spec, const Instant& now) {
@@ -59,7 +62,7 @@ void Core::RunDue() noexcept {
 }
 
 void Core::LookAtDue(Section& section, const Instant& now) {
-  for (const KeyPtr& key : schedule_.Due(now.steady, config_->cache.capacity * 2)) {
+  for (const KeyPtr& key : schedule_.Due(now.steady, kKeysAtOnce)) {
     if (backgroundRequests_ == kMaxBackgroundRequests) {
       break;
     }
@@ -75,8 +78,13 @@ void Core::LookAt(Section& section, const KeyPtr& key, const Instant& now) {
     section.Keep(std::exchange(entry, nullptr));
   }
   const bool hasActAsEnded = HasActAsEnded(key->spec, now);
-  if (entry == nullptr && (!isPinned || hasActAsEnded)) {
+  if (entry == nullptr && !isPinned) {
     schedule_.Remove(key);
+    return;
+  }
+  if (entry == nullptr && hasActAsEnded) {
+    // The clock may be set back.
+    schedule_.Set(key, now.steady + kLookAfterEnd);
     return;
   }
   if (requests_.find(key) != requests_.end()) {

@@ -36,6 +36,14 @@ bool IsAnswer(FailureKind kind) noexcept {
   }
 }
 
+// Whether the service itself has made the answer: a token or a SOAP fault. A proxy, which has a
+// clock of its own, answers with other texts, and may ask for a login (RFC 9110, section 15.5.2).
+bool IsOfService(const AttemptOutcome& outcome) noexcept {
+  constexpr int kUnauthorized = 401;
+  return IsAnswer(outcome.kind) && outcome.kind != FailureKind::kBadAnswer &&
+         outcome.httpStatus != kUnauthorized;
+}
+
 GrantedPeriod PeriodOf(const SamlToken& token, milliseconds clockOffset) {
   return {std::chrono::microseconds(token.StartTime().GetUtcTime()),
           std::chrono::microseconds(token.ExpirationTime().GetUtcTime()), clockOffset};
@@ -117,7 +125,8 @@ LoginVerdict Core::VerdictOf(FailureKind kind) const noexcept {
 }
 
 void Core::NoteClock(Section& section, const Step& step, const AttemptOutcome& outcome) noexcept {
-  if (!outcome.clockOffset || !endpoints_.SetClockOffset(step.endpoint, *outcome.clockOffset)) {
+  if (!outcome.clockOffset || !IsOfService(outcome) ||
+      !endpoints_.SetClockOffset(step.endpoint, *outcome.clockOffset)) {
     return;
   }
   section.ToListener([&] {

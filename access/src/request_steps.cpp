@@ -197,7 +197,8 @@ bool Core::RunAttempt(const RequestPtr& request, Step& step, const std::string& 
     return false;
   }
   if (config_->listener != nullptr) {
-    config_->listener->OnAttemptBegun(step.record);
+    Section::Notify(*config_->listener,
+                    [&step](AccessListener& listener) { listener.OnAttemptBegun(step.record); });
   }
   const bool goesOn = Conclude(request, step, Perform(step, *request, secret));
   if (step.isBaseRefused) {
@@ -245,11 +246,11 @@ Failure Core::ToRemember(const Failure& failure, const std::string& secret) cons
   }
 }
 
-// Without memory, the next refusal does it.
+// If it fails, for want of memory or in a source of the program, the next refusal does it.
 void Core::InvalidateBase(const Step& step) noexcept {
   try {
     std::get<TokenLogin>(config_->login).source->Invalidate(*step.base);
-  } catch (const std::exception&) {
+  } catch (...) {
   }
 }
 

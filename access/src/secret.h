@@ -18,8 +18,9 @@ struct Secret {
   ~Secret() { Tarnik::StringUtil::Cleanse(text); }
 };
 
-/// Recognises a secret without keeping it: SipHash-2-4 with a random key. With its 64 bits, the
-/// secret cannot be found again even by who knows the key, except among a few guesses.
+/// Recognises a secret, or another text, without keeping it: SipHash-2-4 with a random key. With
+/// its 64 bits, the secret cannot be found again even by who knows the key, except among a few
+/// guesses.
 class SecretTagger {
  public:
   using Key = std::array<std::uint64_t, 2>;

@@ -97,10 +97,11 @@ void Section::RunStarted() noexcept {
 
 void Section::ReportAll() noexcept {
   if (ended_ != nullptr && core_.config_->listener != nullptr) {
-    core_.config_->listener->OnAttemptEnded(*ended_);
+    Notify(*core_.config_->listener,
+           [this](AccessListener& listener) { listener.OnAttemptEnded(*ended_); });
   }
   for (const auto& report : reports_) {
-    report(*core_.config_->listener);
+    Notify(*core_.config_->listener, report);
   }
 }
 

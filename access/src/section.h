@@ -55,6 +55,16 @@ class Section {
 
   void Finish() noexcept;
 
+  /// Calls a function of the listener. What it throws is ignored.
+  template <class Call>
+  static void Notify(AccessListener& listener, const Call& call) noexcept {
+    try {
+      call(listener);
+    } catch (...) {
+      // The source works without its listener.
+    }
+  }
+
  private:
   template <class Element>
   static void AddUnlessNull(std::vector<Element>& elements, Element element) noexcept {

@@ -72,13 +72,15 @@ class TokenCache {
   /// The entry of a key, usable or not; null without one.
   EntryPtr Peek(const SpecView& spec) const;
   /// Adds an entry, or replaces the one with its key. Returns what had to make room, which is never
-  /// an entry with a key that `isKept` accepts, unless all are.
+  /// an entry with a key that `isKept` accepts: if all are, the cache grows.
   template <class IsKept>
   EntryPtr Insert(EntryPtr entry, const IsKept& isKept) {
     EntryPtr evicted;
     if (entries_.size() >= capacity_ && Peek(SpecView(*entry->Key())) == nullptr) {
       evicted = LeastUsed(isKept);
-      Remove(SpecView(*evicted->Key()));
+      if (evicted != nullptr) {
+        Remove(SpecView(*evicted->Key()));
+      }
     }
     Store(std::move(entry));
     return evicted;
@@ -102,26 +104,23 @@ class TokenCache {
   };
   class AllSlots;
 
+  /// Null when all are kept.
   template <class IsKept>
   EntryPtr LeastUsed(const IsKept& isKept) const {
     EntryPtr found;
-    bool isFoundKept = true;
     for (const auto& [key, entry] : entries_) {
-      const bool isEntryKept = isKept(key);
-      const bool isBetter =
-          found == nullptr ||
-          (isFoundKept == isEntryKept ? entry->LastUse() < found->LastUse() : isFoundKept);
-      if (isBetter) {
+      const bool isBetter = found == nullptr || entry->LastUse() < found->LastUse();
+      if (isBetter && !isKept(key)) {
         found = entry;
-        isFoundKept = isEntryKept;
       }
     }
     return found;
   }
   void Store(EntryPtr entry);
 
-  const std::size_t capacity_;
+  // First, since they are aligned to cache lines.
   std::array<Slot, CacheEntry::kReplicas> slots_;
+  const std::size_t capacity_;
   Entries entries_;
 };
 

@@ -10,8 +10,8 @@ using std::chrono::microseconds;
 
 constexpr int kMarginDivisor = 20;
 constexpr double kEarliestFraction = 0.1;
-constexpr microseconds kLargestLead = std::chrono::minutes(10);  // the tolerance of the client
-constexpr microseconds kLongestLife = std::chrono::hours(24 * 365 * 30);
+// How far the start of a token may be ahead of the service's clock.
+constexpr microseconds kLargestLead = std::chrono::minutes(2);
 
 microseconds SinceEpoch(Instant::Wall time) {
   return std::chrono::duration_cast<microseconds>(time.time_since_epoch());
@@ -22,7 +22,9 @@ microseconds LifetimeLeft(const GrantedPeriod& period, microseconds serviceNow) 
   return std::max(period.end - std::max(period.start, serviceNow), microseconds(0));
 }
 
-// A proxy may have set the `Date` that the offset comes from.
+// A proxy may have set the `Date` that the offset comes from. If it is slow, the token is handed
+// out past its end by this system's clock, so the token's start has to agree that the service's
+// clock is slow: what is left is never longer than the token's own period.
 microseconds LifetimeGranted(const GrantedPeriod& period, Instant::Wall now) {
   const microseconds serviceNow = SinceEpoch(now) + period.clockOffset;
   const bool isPlausible = serviceNow < period.end && serviceNow + kLargestLead >= period.start;
@@ -40,7 +42,8 @@ double FractionBefore(const RefreshConfig& config, double draw) {
 TokenLife PlanTokenLife(const RefreshConfig& config, const GrantedPeriod& period,
                         const Instant& now, double draw) {
   // The clocks reach further than any token needs, but not as far as a token may state.
-  const microseconds lifetime = std::min(LifetimeGranted(period, now.wall), kLongestLife);
+  const microseconds lifetime =
+      std::min<microseconds>(LifetimeGranted(period, now.wall), kLongestDuration);
   const microseconds margin =
       std::min(lifetime / kMarginDivisor, microseconds(config.longestMargin));
   const microseconds usable = lifetime - margin;

@@ -30,17 +30,30 @@ struct TokenLife {
     if (minimumLife == std::chrono::seconds(0)) {
       return now.steady < usableUntil.steady && now.wall < usableUntil.wall;
     }
-    return end.steady - now.steady >= minimumLife && end.wall - now.wall >= minimumLife;
+    return Covers(end.steady - now.steady, minimumLife) && Covers(end.wall - now.wall, minimumLife);
+  }
+  /// True when the service has granted at least `minimumLife`.
+  bool IsGranted(std::chrono::seconds minimumLife) const noexcept {
+    return Covers(granted, minimumLife);
   }
   bool HasEnded(const Instant& now) const noexcept {
     return now.steady >= end.steady || now.wall >= end.wall;
   }
   bool IsDue(const Instant& now) const noexcept { return now.steady >= refreshAt; }
+
+ private:
+  // In whole seconds, since a minimum of any size need not fit a finer unit.
+  template <class Duration>
+  static bool Covers(Duration left, std::chrono::seconds minimumLife) noexcept {
+    return std::chrono::floor<std::chrono::seconds>(left) >= minimumLife;
+  }
 };
 
-/// Plans the life of a token that was received at `now`. An offset with which the token would not
-/// be valid now is ignored, since the token has just been issued. The life of a token that has
-/// ended has `granted` zero. `draw` is random, at least 0 and below 1.
+/// Plans the life of a token that was received at `now`. The token has just been issued, so an
+/// offset with which it would have ended, or would begin more than two minutes from now, is
+/// ignored. With an offset below zero, the life ends after the token's end by this system's clock:
+/// by at most the offset, and at most as long as the token's start is past. The life of a token
+/// that has ended has `granted` zero. `draw` is random, at least 0 and below 1.
 TokenLife PlanTokenLife(const RefreshConfig& config, const GrantedPeriod& period,
                         const Instant& now, double draw);
 

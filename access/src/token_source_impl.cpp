@@ -42,7 +42,7 @@ Core::Parts MakeSystemParts(const std::shared_ptr<const TokenSourceConfig>& conf
   parts.config = config;
   parts.runtime = CreateSystemRuntime();
   for (const Endpoint& endpoint : config->endpoints) {
-    parts.clients.push_back(CreateEndpointClient(*config, endpoint));
+    parts.clients.push_back(CreateEndpointClient(config, endpoint));
   }
   return parts;
 }
@@ -125,6 +125,7 @@ bool TokenSourceImpl::Stop(std::chrono::milliseconds wait) {
 
 std::shared_ptr<TokenSource> CreateTokenSource(TokenSourceConfig config) {
   CheckConfig(config);
+  LimitDurations(config);
   const auto shared = std::make_shared<const TokenSourceConfig>(std::move(config));
   return std::make_shared<TokenSourceImpl>([shared] { return MakeSystemParts(shared); });
 }

@@ -31,6 +31,8 @@ class Waiter {
   const CallContext& Context() const noexcept { return context_; }
   /// Ends the wait. Called once, without a lock.
   virtual void Receive(Answer answer) noexcept = 0;
+  /// The same in the call of the waiter itself, which fails if there is no thread to report on.
+  virtual void ReceiveOrThrow(Answer answer) = 0;
 
   /// What it waits for; null before and after. Under the lock of the core, as is the timer.
   std::shared_ptr<Request> request;
@@ -54,6 +56,7 @@ class BlockedCaller final : public Waiter {
   using Waiter::Waiter;
 
   void Receive(Answer answer) noexcept override;
+  void ReceiveOrThrow(Answer answer) override { Receive(std::move(answer)); }
   /// Blocks until there is an answer.
   Answer Wait();
 
@@ -81,7 +84,7 @@ class CallbackCaller final : public Waiter, public std::enable_shared_from_this<
   /// If no worker can be started, the callback runs on this thread.
   void Receive(Answer answer) noexcept override;
   /// The same, but throws if no worker can be started. The callback then never runs.
-  void ReceiveOrThrow(Answer answer);
+  void ReceiveOrThrow(Answer answer) override;
 
  private:
   void Schedule();

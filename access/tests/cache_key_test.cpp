@@ -1,6 +1,10 @@
 #include "cache_key.h"
 
+#include <cstdint>
+#include <cstring>
 #include <functional>
+#include <string>
+#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -80,6 +84,42 @@ TEST(CacheKeyTest, AllValuesForBearerAreEqual) {
   other.confirmation = static_cast<ConfirmationType>(7);
   EXPECT_TRUE(AreEqual(bearer, other));
   EXPECT_EQ(HashOf(bearer), HashOf(other));
+}
+
+// Two texts of 16 bytes with one hash by the standard library, which has no key: the second word is
+// chosen so that it undoes the difference of the first (MurmurHash64A).
+std::pair<std::string, std::string> TextsWithOneStandardHash() {
+  constexpr std::uint64_t kFactor = 0xc6a4a7935bd1e995U;
+  std::uint64_t inverse = 1;
+  for (int i = 0; i < 6; ++i) {
+    inverse *= 2 - kFactor * inverse;
+  }
+  const auto fold = [](std::uint64_t value) { return value ^ (value >> 47); };
+  const auto mixed = [&](std::uint64_t word) { return fold(word * kFactor) * kFactor; };
+  const auto text = [](std::uint64_t first, std::uint64_t second) {
+    std::string bytes(16, '\0');
+    std::memcpy(bytes.data(), &first, 8);
+    std::memcpy(bytes.data() + 8, &second, 8);
+    return bytes;
+  };
+  const std::uint64_t begun = 0xc70f6907U ^ (16 * kFactor);
+  const std::uint64_t one = (begun ^ mixed(1)) * kFactor;
+  const std::uint64_t other = (begun ^ mixed(2)) * kFactor;
+  const std::uint64_t undone = fold((one ^ other ^ mixed(3)) * inverse) * inverse;
+  return {text(1, 3), text(2, undone)};
+}
+
+TEST(CacheKeyTest, TextsCannotBeChosenForTheirHash) {
+  const auto [one, other] = TextsWithOneStandardHash();
+  if (std::hash<std::string>()(one) != std::hash<std::string>()(other)) {
+    GTEST_SKIP() << "another standard library";
+  }
+  TokenSpec first;
+  first.audienceRestriction = {one};
+  TokenSpec second;
+  second.audienceRestriction = {other};
+  EXPECT_NE(HashOf(first), HashOf(second));
+  EXPECT_EQ(HashOf(first), HashOf(first));
 }
 
 TEST(CacheKeyTest, ViewsAreEqualToTheirKeys) {

@@ -1,8 +1,11 @@
 #include <atomic>
+#include <memory>
 #include <thread>
 #include <vector>
 
 #include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include <ssoclient/access/call_context.h>
 #include <tarnik/core/exception.h>
@@ -96,6 +99,100 @@ TEST(CancellationTest, RegistrationMayBeRemovedByWhatItRuns) {
   });
   source.Cancel();
   EXPECT_EQ(runs, 1);
+}
+
+TEST(CancellationTest, SourceMayBeDestroyedByWhatItRuns) {
+  struct Session {
+    CancellationSource cancellation;
+    CancellationRegistration first;
+    CancellationRegistration second;
+  };
+  auto session = std::make_unique<Session>();
+  int runs = 0;
+  session->first = session->cancellation.Token().OnCancel([&] {
+    ++runs;
+    session.reset();
+  });
+  session->second = session->cancellation.Token().OnCancel([&] { runs += 10; });
+  session->cancellation.Cancel();
+  EXPECT_EQ(session, nullptr);
+  EXPECT_EQ(runs, 1);
+}
+
+// The exit status of a child that runs `body` and ends with its result.
+template <class Body>
+int InChild(const Body& body) {
+  const pid_t child = fork();
+  if (child == 0) {
+    alarm(20);
+    _exit(body());
+  }
+  int status = -1;
+  EXPECT_EQ(waitpid(child, &status, 0), child);
+  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+TEST(CancellationForkTest, ChildRunsOnlyWhatItHasRegistered) {
+  const CancellationSource source;
+  int runs = 0;
+  auto ofParent = source.Token().OnCancel([&] { ++runs; });
+  EXPECT_EQ(InChild([&] {
+              const auto own = source.Token().OnCancel([&] { runs += 10; });
+              ofParent = {};
+              source.Cancel();
+              return source.Token().IsCancelled() ? runs : 100;
+            }),
+            10);
+  EXPECT_EQ(InChild([&] {
+              source.Cancel();
+              const auto own = source.Token().OnCancel([&] { runs += 10; });
+              return runs;
+            }),
+            10);
+  EXPECT_FALSE(source.Token().IsCancelled());
+  source.Cancel();
+  EXPECT_EQ(runs, 1);
+}
+
+TEST(CancellationForkTest, RegistrationOfTheParentRemovesNothingInTheChild) {
+  const CancellationSource source;
+  int runs = 0;
+  EXPECT_EQ(InChild([&] {
+              // The child of a child, whose first registration is its parent's second.
+              auto ofParent = source.Token().OnCancel([&] { ++runs; });
+              return InChild([&] {
+                const auto own = source.Token().OnCancel([&] { runs += 10; });
+                ofParent = {};
+                source.Cancel();
+                return runs;
+              });
+            }),
+            10);
+}
+
+TEST(CancellationForkTest, ChildIsNotBlockedByALockOfTheParent) {
+  const CancellationSource source;
+  std::atomic<bool> mayEnd{false};
+  std::vector<std::thread> threads;
+  for (int i = 0; i < 2; ++i) {
+    threads.emplace_back([&] {
+      while (!mayEnd) {
+        const auto registration = source.Token().OnCancel([] {});
+      }
+    });
+  }
+  for (int i = 0; i < 40; ++i) {
+    EXPECT_EQ(InChild([&] {
+                const auto own = source.Token().OnCancel([] {});
+                source.Cancel();
+                return 0;
+              }),
+              0);
+  }
+  mayEnd = true;
+  for (auto& thread : threads) {
+    thread.join();
+  }
 }
 
 TEST(CancellationTest, RemovalWaitsForWhatRunsOnAnotherThread) {

@@ -25,6 +25,13 @@ HolderOfKeyConfig Key() {
   return {Tarnik::MakeRef<Testing::NamedCertificate>("own"), nullptr};
 }
 
+TokenSpec SpecFor(const std::string& audience) {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 60;
+  spec.audienceRestriction = {audience};
+  return spec;
+}
+
 struct BadConfig {
   const char* message;
   std::function<void(TokenSourceConfig&)> spoil;
@@ -38,6 +45,8 @@ std::vector<BadConfig> BadConfigs() {
       "The fraction of the lifetime after which tokens are refreshed is not between 0 and 1.";
   const char* jitter = "The jitter of refreshes is not between 0 and 1.";
   const char* limit = "The limit of an attempt is not between 1 ms and 240 s.";
+  const char* text =
+      "The text holds what XML cannot carry: a control character or bytes that are not UTF-8.";
   const char* delay = "A delay between attempts is negative.";
   return {
       {"There is no endpoint.", [](auto& config) { config.endpoints.clear(); }},
@@ -73,6 +82,13 @@ std::vector<BadConfig> BadConfigs() {
        [](auto& config) { config.retry.failuresToOpen = 0; }},
       {"The time for which a refused login is remembered is negative.",
        [](auto& config) { config.retry.refusalMemory = seconds(-1); }},
+      {"Some endpoints are https URLs and others http URLs: a failure of TLS would send the login "
+       "in "
+       "plain text.",
+       [](auto& config) {
+         config.endpoints.push_back({"http://sts.example.com", ""});
+       }},
+      {text, [](auto& config) { config.keepFresh = {SpecFor("\x01")}; }},
       {"The capacity of the cache is 0.", [](auto& config) { config.cache.capacity = 0; }},
       {"The lifetime of the token is not positive.",
        [](auto& config) { config.keepFresh = {TokenSpec()}; }},
@@ -103,6 +119,31 @@ TEST(ConfigCheckTest, BadConfigIsRefusedWithItsReason) {
       EXPECT_EQ(refusal.Message(), bad.message);
     }
   }
+}
+
+TEST(ConfigCheckTest, EndpointsOfOneSchemeAreAccepted) {
+  TokenSourceConfig config = Good();
+  config.endpoints.push_back({"HTTPS://other.example.com:444/sts", ""});
+  EXPECT_NO_THROW(CheckConfig(config));
+  config.endpoints = {{"http://a.example.com", ""}, {"http://b.example.com", ""}};
+  EXPECT_NO_THROW(CheckConfig(config));
+}
+
+TEST(ConfigCheckTest, EveryTextOfASpecIsRead) {
+  const std::string bad = "\xff";
+  TokenSpec spec = SpecFor("good");
+  EXPECT_NO_THROW(CheckTexts(spec));
+  spec.delegateTo = bad;
+  EXPECT_THROW(CheckTexts(spec), Tarnik::InvalidArgumentException);
+  spec.delegateTo = "good";
+  const AdviceAttribute good{"name", {"value"}};
+  for (const auto& advice : {Advice{bad, {good}}, Advice{"source", {{bad, {}}}},
+                             Advice{"source", {{"name", {"value", bad}}}}}) {
+    spec.advice = {advice};
+    EXPECT_THROW(CheckTexts(spec), Tarnik::InvalidArgumentException);
+  }
+  spec.advice = {Advice{"source", {good}}};
+  EXPECT_NO_THROW(CheckTexts(spec));
 }
 
 TEST(ConfigCheckTest, TokenLoginNeedsAKeyAndASpec) {

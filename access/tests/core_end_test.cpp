@@ -1,6 +1,9 @@
 #include <atomic>
+#include <functional>
 #include <future>
+#include <memory>
 #include <thread>
+#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -73,6 +76,119 @@ TEST_F(CoreEndTest, LastReferenceMayBeReleasedInACallback) {
   });
   runtime->Settle();
   EXPECT_EQ(calls, 1);
+}
+
+// Work runs on another thread, and has ended before `Run` returns: it is faster than the caller.
+class ImmediateRuntime final : public Runtime {
+ public:
+  Instant Now() const override { return virtual_->Now(); }
+  double Draw() override { return virtual_->Draw(); }
+  void Run(std::function<void()> work) override {
+    std::thread worker([work = std::move(work)]() mutable {
+      work();
+      work = nullptr;
+    });
+    worker.join();
+  }
+  Tarnik::Ref<Tarnik::System::CancellableItem> RunAt(Instant::Steady time,
+                                                     std::function<void()> action) override {
+    return virtual_->RunAt(time, std::move(action));
+  }
+
+ private:
+  const std::shared_ptr<VirtualRuntime> virtual_ = std::make_shared<VirtualRuntime>();
+};
+
+class FastWorkerTest : public CoreEndTest {
+ protected:
+  FastWorkerTest() { config.endpoints.resize(1); }
+
+  std::unique_ptr<TokenSource> MakeFast() {
+    const auto shared = std::make_shared<const TokenSourceConfig>(config);
+    return std::make_unique<TokenSourceImpl>([shared, scripts = scripts] {
+      Core::Parts parts{shared, std::make_shared<ImmediateRuntime>(), {}};
+      parts.clients.push_back(std::make_unique<ScriptedEndpoint>(shared->endpoints[0], scripts[0]));
+      return parts;
+    });
+  }
+};
+
+TEST_F(FastWorkerTest, LastReferenceMayBeReleasedBeforeTheCallReturns) {
+  std::unique_ptr<TokenSource> last = MakeFast();
+  const CancellationSource cancellation;
+  CallContext context;
+  context.cancellation = cancellation.Token();
+  TokenSource* const raw = last.get();
+  int calls = 0;
+  raw->GetTokenAsync(spec, context, [&](const auto&, const Tarnik::Exception*) {
+    last.reset();
+    ++calls;
+  });
+  EXPECT_EQ(calls, 1);
+  EXPECT_EQ(last, nullptr);
+}
+
+TEST_F(FastWorkerTest, LastReferenceMayBeReleasedInACallbackOfStop) {
+  std::unique_ptr<TokenSource> last = MakeFast();
+  TokenSource* const raw = last.get();
+  int calls = 0;
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    raw->Stop(milliseconds(0));
+    return Issued(NewToken(hours(1)));
+  });
+  raw->GetTokenAsync(spec, {}, [&](const auto&, const Tarnik::Exception* failure) {
+    EXPECT_NE(failure, nullptr);
+    last.reset();
+    ++calls;
+  });
+  EXPECT_EQ(calls, 1);
+}
+
+TEST_F(FastWorkerTest, CancelMayReleaseItsSourceInTheCallback) {
+  struct Session {
+    std::unique_ptr<TokenSource> source;
+    CancellationSource cancellation;
+  };
+  auto session = std::make_unique<Session>();
+  session->source = MakeFast();
+  TokenSource* const raw = session->source.get();
+  CallContext context;
+  context.cancellation = session->cancellation.Token();
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    session->cancellation.Cancel();
+    return Unreachable();
+  });
+  int calls = 0;
+  raw->GetTokenAsync(spec, std::exchange(context, {}),
+                     [&](const auto&, const Tarnik::Exception* failure) {
+                       EXPECT_NE(dynamic_cast<const Tarnik::CancelledException*>(failure), nullptr);
+                       session.reset();
+                       ++calls;
+                     });
+  EXPECT_EQ(calls, 1);
+}
+
+TEST_F(CoreEndTest, CallbackNeverRunsInItsOwnCall) {
+  Make();
+  Get(spec);
+  runtime->RefuseWork(true);
+  CallContext tooLong;
+  tooLong.minimumLife = hours(2);
+  CallContext cancelled;
+  const CancellationSource cancellation;
+  cancelled.cancellation = cancellation.Token();
+  cancellation.Cancel();
+  bool hasRun = false;
+  const auto callback = [&](const auto&, const Tarnik::Exception*) { hasRun = true; };
+  EXPECT_THROW(source->GetTokenAsync(spec, tooLong, callback), Tarnik::ResourceException);
+  EXPECT_THROW(source->GetTokenAsync(spec, cancelled, callback), Tarnik::ResourceException);
+  EXPECT_THROW(source->GetTokenAsync(spec, {}, callback), Tarnik::ResourceException);
+  EXPECT_THROW(source->GetTokenAsync(SpecFor("https://new.example.com"), {}, callback),
+               Tarnik::ResourceException);
+  EXPECT_FALSE(hasRun);
+  runtime->RefuseWork(false);
+  EXPECT_EQ(source->Metrics().callersWaiting, 0U);
+  EXPECT_TRUE(source->Stop(milliseconds(0)));
 }
 
 TEST_F(CoreEndTest, StopReportsThatAFunctionIsStillRunning) {

@@ -156,6 +156,15 @@ TEST_F(CoreTest, TokenThatArrivesAfterAllHaveLeftIsCached) {
   EXPECT_NE(source->TryGetToken(spec), nullptr);
 }
 
+TEST_F(CoreTest, SpecWithATextThatCannotBeSentIsRefused) {
+  Make();
+  TokenSpec bad = spec;
+  bad.audienceRestriction = {"\x01"};
+  EXPECT_THROW(source->TryGetToken(bad), Tarnik::InvalidArgumentException);
+  EXPECT_TRUE(Get(bad).Is<Tarnik::InvalidArgumentException>());
+  EXPECT_EQ(passwordCalls, 0);
+}
+
 TEST_F(CoreTest, CancellationEndsOneCall) {
   Make();
   const CancellationSource cancellation;

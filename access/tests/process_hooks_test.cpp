@@ -6,6 +6,7 @@
 #include <functional>
 #include <string>
 #include <thread>
+#include <vector>
 
 #include <gtest/gtest.h>
 #include <sys/wait.h>
@@ -102,6 +103,25 @@ TEST_F(ProcessHooksTest, ExitWithCallsUnderWayReportsEachOnce) {
               std::exit(0);
             }),
             "[The process is ending.][The process is ending.][The process is ending.] 0");
+}
+
+TEST_F(ProcessHooksTest, SourcesShareTheWaitAtTheEnd) {
+  constexpr int kSources = 10;
+  // The callbacks of none of them run.
+  std::vector<std::shared_ptr<TokenSourceImpl>> sources;
+  std::vector<std::shared_ptr<Reply>> replies;
+  for (int i = 0; i < kSources; ++i) {
+    Make();
+    replies.push_back(Ask(spec));
+    sources.push_back(source);
+  }
+  const auto begun = std::chrono::steady_clock::now();
+  EndCoresOfProcess();
+  EXPECT_LT(std::chrono::steady_clock::now() - begun, milliseconds(200) * (kSources - 1));
+  runtime->DropWork();
+  for (const auto& reply : replies) {
+    EXPECT_EQ(reply->calls, 1);
+  }
 }
 
 TEST_F(ProcessHooksTest, ExitWakesABlockedCaller) {

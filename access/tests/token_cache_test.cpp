@@ -128,7 +128,9 @@ TEST_F(TokenCacheTest, EvictsWhatIsKeptOnlyIfAllAre) {
     Pass(seconds(1));
   }
   EXPECT_EQ(cache.Insert(MakeEntry(4), isKept)->Token()->Id(), "3");
-  EXPECT_EQ(cache.Insert(MakeEntry(5), isKept)->Token()->Id(), "1");
+  EXPECT_EQ(cache.Insert(MakeEntry(5), isKept), nullptr);
+  EXPECT_EQ(cache.Size(), 4U);
+  EXPECT_NE(Find(1).token, nullptr);
 }
 
 TEST_F(TokenCacheTest, RemoveOfAnUnknownKeyDoesNothing) {

@@ -85,6 +85,25 @@ TEST_F(TokenLifeTest, OffsetWithWhichTheTokenIsNotValidIsIgnored) {
             hours(1));
 }
 
+TEST_F(TokenLifeTest, SlowServiceClockCountsAsFarAsTheTokenAgrees) {
+  const auto granted = [&](microseconds start, microseconds end, milliseconds offset) {
+    return PlanTokenLife(config, From(start, end, offset), now, 0.5).granted;
+  };
+  // The service is 90 s slow. Its token begins now, in the past, or in the future, by its clock.
+  const seconds slow(-90);
+  EXPECT_EQ(granted(slow, slow + minutes(5), slow), minutes(5));
+  EXPECT_EQ(granted(slow - minutes(10), slow + minutes(5), slow), minutes(5));
+  EXPECT_EQ(granted(slow + minutes(2), slow + minutes(7), slow), minutes(5));
+  EXPECT_EQ(granted(slow, slow + seconds(60), slow), seconds(60));
+  // A `Date` that the token contradicts does not count.
+  EXPECT_EQ(granted(minutes(-5), minutes(5), minutes(-15)), minutes(5));
+  EXPECT_EQ(granted(minutes(0), minutes(5), minutes(-9)), minutes(5));
+  EXPECT_EQ(granted(minutes(-1), minutes(5), minutes(-4)), minutes(5));
+  // The end is passed by no more than both say.
+  EXPECT_EQ(granted(minutes(-1), minutes(5), minutes(-3)), minutes(6));
+  EXPECT_EQ(granted(minutes(-30), minutes(5), minutes(-3)), minutes(8));
+}
+
 TEST_F(TokenLifeTest, TokenThatHasEndedGrantsNothing) {
   const TokenLife life = PlanTokenLife(config, From(hours(-2), hours(-1)), now, 0.5);
   EXPECT_EQ(life.granted, seconds(0));

@@ -62,22 +62,20 @@ struct Attempting {
 
 class EndpointClientImpl final : public EndpointClient {
  public:
-  EndpointClientImpl(const TokenSourceConfig& config, const Endpoint& endpoint)
-      : endpoint_(endpoint),
-        target_(ResolveTarget(endpoint, config.sslContext.get())),
+  EndpointClientImpl(std::shared_ptr<const TokenSourceConfig> config, Endpoint endpoint)
+      : endpoint_(std::move(endpoint)),
+        target_(ResolveTarget(endpoint_, config->sslContext.get())),
         pool_(Tarnik::Http::CreateConnectionPool()),
-        tokenFactory_(config.tokenFactory),
-        holderOfKey_(config.holderOfKey),
-        login_(config.login) {
+        config_(std::move(config)) {
     // Checks what all attempts have in common.
-    CreateSecurityTokenService(ServiceConfig(Agent(), tokenFactory_));
+    CreateSecurityTokenService(ServiceConfig(Agent(), config_->tokenFactory));
   }
 
   const Endpoint& Where() const override { return endpoint_; }
 
   AttemptOutcome Attempt(const AttemptRequest& request, Tarnik::Http::CallLimit& limit) override {
     const auto begun = std::chrono::steady_clock::now();
-    Attempting attempting(tokenFactory_);
+    Attempting attempting(config_->tokenFactory);
     AttemptOutcome outcome;
     try {
       outcome.token = Perform(request, limit, attempting);
@@ -122,7 +120,7 @@ class EndpointClientImpl final : public EndpointClient {
     config.url = target_.path;
     config.userAgent = agent;
     config.tokenFactory = std::move(factory);
-    config.holderOfKeyConfig = holderOfKey_;
+    config.holderOfKeyConfig = config_->holderOfKey;
     return config;
   }
 
@@ -144,13 +142,13 @@ class EndpointClientImpl final : public EndpointClient {
 
   Token LogIn(const SecurityTokenService& service, const AttemptRequest& request,
               Attempting& attempting) const {
-    if (const auto* password = std::get_if<PasswordLogin>(&login_)) {
+    if (const auto* password = std::get_if<PasswordLogin>(&config_->login)) {
       return service.AcquireToken(password->userName, request.secret, request.spec);
     }
-    if (std::holds_alternative<CertificateLogin>(login_)) {
+    if (std::holds_alternative<CertificateLogin>(config_->login)) {
       return service.AcquireTokenByCertificate(request.spec);
     }
-    if (const auto* negotiated = std::get_if<NegotiatedLogin>(&login_)) {
+    if (const auto* negotiated = std::get_if<NegotiatedLogin>(&config_->login)) {
       return Negotiate(service, *negotiated, request.spec, attempting);
     }
     throw Tarnik::InvalidStateException("A login by token exchanges a token.");
@@ -191,7 +189,7 @@ class EndpointClientImpl final : public EndpointClient {
     if (request.base != nullptr) {
       return request.base->Subject();
     }
-    const auto* password = std::get_if<PasswordLogin>(&login_);
+    const auto* password = std::get_if<PasswordLogin>(&config_->login);
     return password == nullptr ? boost::none : SubjectOf(password->userName);
   }
 
@@ -201,21 +199,20 @@ class EndpointClientImpl final : public EndpointClient {
         request.operation == AttemptOperation::kLogin && request.spec.actAsToken;
     const bool asksForKey = request.operation == AttemptOperation::kRenewal ||
                             (request.spec.confirmation == CONFIRMATION_DEFAULT && !isUnsigned);
-    return asksForKey ? holderOfKey_.get_ptr() : nullptr;
+    return asksForKey ? config_->holderOfKey.get_ptr() : nullptr;
   }
 
   const Endpoint endpoint_;
   const Target target_;
   const Tarnik::Ref<Tarnik::Http::ConnectionPool> pool_;
-  const std::shared_ptr<SamlTokenFactory> tokenFactory_;
-  const boost::optional<HolderOfKeyConfig> holderOfKey_;
-  const Login login_;
+  /// All endpoints of a source use the same functions of the login, not copies of them.
+  const std::shared_ptr<const TokenSourceConfig> config_;
 };
 
 }  // namespace
 
-std::unique_ptr<EndpointClient> CreateEndpointClient(const TokenSourceConfig& config,
-                                                     const Endpoint& endpoint) {
+std::unique_ptr<EndpointClient> CreateEndpointClient(
+    const std::shared_ptr<const TokenSourceConfig>& config, const Endpoint& endpoint) {
   return std::make_unique<EndpointClientImpl>(config, endpoint);
 }
 

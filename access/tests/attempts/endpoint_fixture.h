@@ -17,6 +17,12 @@ using SsoClient::Testing::kUser;
 /// A configuration with a password login of `kUser` that trusts `server`.
 TokenSourceConfig ConfigFor(const DevSts::Server& server);
 
+/// A client with a copy of `config`.
+inline std::unique_ptr<EndpointClient> CreateEndpointClient(const TokenSourceConfig& config,
+                                                            const Endpoint& endpoint) {
+  return CreateEndpointClient(std::make_shared<const TokenSourceConfig>(config), endpoint);
+}
+
 /// A limit that no test reaches.
 Tarnik::Ref<Tarnik::Http::CallLimit> AMinute();
 

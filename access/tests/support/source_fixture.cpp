@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "config_check.h"
+
 namespace SsoClient::Access::Testing {
 
 namespace {
@@ -36,7 +38,9 @@ SourceFixture::SourceFixture() {
 }
 
 void SourceFixture::Make() {
-  const auto shared = std::make_shared<const TokenSourceConfig>(config);
+  TokenSourceConfig limited = config;
+  LimitDurations(limited);
+  const auto shared = std::make_shared<const TokenSourceConfig>(std::move(limited));
   source = std::make_shared<TokenSourceImpl>([shared, runtime = runtime, scripts = scripts] {
     return MakeParts(shared, runtime, scripts);
   });

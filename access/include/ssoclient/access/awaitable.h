@@ -5,6 +5,7 @@
 #error "ssoclient/access/awaitable.h needs C++20"
 #endif
 
+#include <chrono>
 #include <coroutine>
 #include <memory>
 #include <new>
@@ -38,7 +39,7 @@ class TokenAwaitable::Awaiter {
   Awaiter& operator=(const Awaiter&) = delete;
 
   bool await_ready() {
-    if (context_.minimumLife == std::chrono::seconds(0)) {
+    if (MayTakeFromCache()) {
       token_ = source_->TryGetToken(spec_);
     }
     return token_ != nullptr;
@@ -67,6 +68,13 @@ class TokenAwaitable::Awaiter {
   }
 
  private:
+  /// Otherwise `TokenSource::GetTokenAsync` decides.
+  bool MayTakeFromCache() const noexcept {
+    return context_.minimumLife == std::chrono::seconds(0) &&
+           !context_.cancellation.IsCancelled() &&
+           (context_.deadline == CallContext::Clock::time_point::max() ||
+            context_.deadline > CallContext::Clock::now());
+  }
   void Keep(const Tarnik::Exception* failure) noexcept {
     if (failure == nullptr) {
       return;
@@ -96,7 +104,8 @@ inline TokenAwaitable::Awaiter TokenAwaitable::operator co_await() && {
 ///
 /// If the token is in the cache, the coroutine does not suspend. Otherwise it continues on a worker
 /// thread of the platform's pool, where it may block; an exception that leaves it there ends the
-/// process.
+/// process. When `TokenSource::GetTokenAsync` itself throws, the coroutine continues at once, on
+/// its own thread, with that exception.
 [[nodiscard]] inline TokenAwaitable AwaitToken(std::shared_ptr<TokenSource> source, TokenSpec spec,
                                                CallContext context = {}) {
   return TokenAwaitable(std::move(source), std::move(spec), std::move(context));

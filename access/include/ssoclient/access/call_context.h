@@ -52,6 +52,9 @@ class SSOCLIENT_ACCESS_EXPORT CancellationToken {
 };
 
 /// Cancels the calls that were made with its token. Copies share one state. Thread-safe.
+///
+/// In a forked child, it cancels what the child has begun: functions that its parent has
+/// registered, and calls of the parent, are left to the parent.
 class SSOCLIENT_ACCESS_EXPORT CancellationSource {
  public:
   CancellationSource();
@@ -59,7 +62,7 @@ class SSOCLIENT_ACCESS_EXPORT CancellationSource {
   CancellationToken Token() const noexcept { return token_; }
   /// Ends the calls under way with `Tarnik::CancelledException`, and those that are made later. The
   /// registered functions have run when the first call of `Cancel` returns. May be called any
-  /// number of times.
+  /// number of times. What it runs, a callback too, may destroy this object.
   void Cancel() const noexcept;
 
  private:
@@ -78,17 +81,17 @@ struct CallContext {
   /// Ends the call earlier, with `Tarnik::CancelledException`.
   CancellationToken cancellation{};
   /// The token must be valid for at least this long; zero means the source's own margin
-  /// (`RefreshConfig::longestMargin`).
+  /// (`RefreshConfig::longestMargin`). Not negative.
   std::chrono::seconds minimumLife{0};
 
-  /// A context whose deadline is `duration` from now; negative durations count as zero, and those
-  /// that are too long for the clock as no deadline.
+  /// A context whose deadline is `duration` from now. Negative durations, and what is not a number,
+  /// count as zero, and those that are too long for the clock as no deadline.
   template <class Rep, class Period>
   static CallContext Within(std::chrono::duration<Rep, Period> duration) {
     using Seconds = std::chrono::duration<double>;
     const auto now = Clock::now();
     CallContext context;
-    if (Seconds(duration) <= Seconds::zero()) {
+    if (!(Seconds(duration) > Seconds::zero())) {
       context.deadline = now;
     } else if (Seconds(duration) < Seconds(Clock::time_point::max() - now) / 2) {
       context.deadline = now + std::chrono::duration_cast<Clock::duration>(duration);

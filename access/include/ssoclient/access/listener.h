@@ -45,7 +45,7 @@ struct CircuitRecord {
 };
 
 /// The `Date` of an endpoint's answers began, or ceased, to differ from this system's clock by more
-/// than 30 seconds.
+/// than 30 seconds. Only the answers of the service itself count: issued tokens and SOAP faults.
 struct ClockRecord {
   std::string source;
   std::string endpoint;
@@ -87,8 +87,8 @@ struct RefreshFailureRecord {
 ///
 /// The functions do nothing unless they are overridden. They run on worker threads of the platform
 /// (on others only when no worker can be started), several at once. They should return quickly, and
-/// must not throw or call the source. Later versions add no functions here, but may add an
-/// interface that is derived from this one.
+/// must not call the source. Exceptions of any type that leave them are ignored. Later versions add
+/// no functions here, but may add an interface that is derived from this one.
 class SSOCLIENT_ACCESS_EXPORT AccessListener {
  public:
   virtual ~AccessListener();

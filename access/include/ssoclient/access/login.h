@@ -14,13 +14,16 @@ namespace SsoClient::Access {
 
 class TokenSource;
 
-/// Logs in with a user name and a password.
+/// Logs in with a user name and a password. Only one source of one process protects the account
+/// (see `TokenSource`): if several sources have the same account, or several processes such as the
+/// children of a pre-forking server, each sends a wrong password once.
 struct PasswordLogin {
   std::string userName{};
   /// Returns the password, which must not be empty; its text is cleansed from memory after use.
   /// Called on a worker thread before each login, so that a changed file or vault takes effect at
-  /// once. It may block: callers still end at their deadlines, and its result is then dropped. An
-  /// exception that it throws reaches the callers that wait for the login, and nothing is sent or
+  /// once. It may block: callers still end at their deadlines, and its result is then dropped. All
+  /// calls use the same copy of this function, several at once. An exception of any type that it
+  /// throws reaches the callers that wait for the login, and nothing is sent or
   /// remembered. Must be set.
   std::function<std::string()> password{};
 };
@@ -32,7 +35,8 @@ struct CertificateLogin {};
 /// Logs in by a negotiation such as Kerberos.
 struct NegotiatedLogin {
   /// Returns a new handler, never null. Called on a worker thread for each login at each endpoint;
-  /// may block and throw as `PasswordLogin::password` may. Must be set. With the handler of
+  /// may block and throw as `PasswordLogin::password` may. All calls use the same copy of this
+  /// function, several at once. Must be set. With the handler of
   /// `ssoclient/gssapi_negotiation_handler.h`:
   ///
   ///     NegotiatedLogin{[](const Endpoint&) {

@@ -26,6 +26,8 @@
 
 namespace SsoClient::Access {
 
+// Durations of the configuration that are longer than thirty years count as thirty years.
+
 /// When tokens are replaced.
 struct RefreshConfig {
   /// The fraction of a token's lifetime after which a background refresh begins; between 0 and 1,
@@ -76,16 +78,17 @@ struct RetryConfig {
 
 struct CacheConfig {
   /// The number of tokens kept; at least 1. The one that was not asked for the longest is evicted
-  /// first.
+  /// first. If tokens that are kept fresh fill the cache, it has room for one more.
   std::size_t capacity = 1000;
 };
 
 struct TokenSourceConfig {
   /// Names the source in records and log lines; may be empty.
   std::string name{};
-  /// At least one. All accept the same logins and issue tokens that `tokenFactory` accepts. The
-  /// order is that of preference. Sources with the same order all use the first one while it
-  /// answers; many servers that are to share equal endpoints list them in different orders.
+  /// At least one. All are https URLs, or all are http URLs. All accept the same logins and issue
+  /// tokens that `tokenFactory` accepts. The order is that of preference. Sources with the same
+  /// order all use the first one while it answers; many servers that are to share equal endpoints
+  /// list them in different orders.
   std::vector<Endpoint> endpoints{};
   /// The TLS trust and settings; may be null if all endpoints are http URLs.
   Tarnik::Ref<Tarnik::Ssl::SSLContext> sslContext{};
@@ -157,7 +160,9 @@ struct TokenSourceMetrics {
 /// more than ten seconds ago. The refusal is then answered from memory, with the same exception
 /// class and message, until the secret changes or `RetryConfig::refusalMemory` has passed. When an
 /// exchange is refused, the token to exchange is replaced once; a second refusal is remembered in
-/// the same way, but only for its spec.
+/// the same way, but only for its spec. Sources do not share what they know of refusals, not with
+/// those of other processes either: each of several sources with one account, and each child that
+/// was forked before, sends a wrong login once.
 ///
 /// A source may be used in a forked child, where it begins with an empty cache. When the process
 /// ends, calls end as those of `SecurityTokenService` do. Destroying a source stops it; the last
@@ -171,8 +176,9 @@ class SSOCLIENT_ACCESS_EXPORT TokenSource {
  public:
   /// Receives a token and null, or null and the exception, which is valid only during the call.
   /// Called exactly once, on a worker thread of the platform's pool, where it may block. Only when
-  /// no worker can be started is it called on another thread of the platform, or on the one that
-  /// cancels or stops. It must not throw: an exception that leaves it ends the process.
+  /// no worker can be started is it called on another thread of the platform, or on one that
+  /// cancels, stops or calls the source, but never in its own call of `GetTokenAsync`. It must not
+  /// throw: an exception that leaves it ends the process.
   using TokenCallback =
       std::function<void(const std::shared_ptr<const SamlToken>&, const Tarnik::Exception*)>;
 
@@ -215,15 +221,17 @@ class SSOCLIENT_ACCESS_EXPORT TokenSource {
   /// Ends all that is under way: waiting calls throw `Tarnik::InvalidStateException`, callbacks
   /// receive it, as does every later call, also for tokens in the cache. Waits at most `wait` until
   /// no function of the login and no callback is running on another thread; returns whether that
-  /// is so. May be called several times, also in a callback.
+  /// is so. A negative `wait` counts as zero. May be called several times, also in a callback.
   virtual bool Stop(std::chrono::milliseconds wait = std::chrono::seconds{1}) = 0;
 };
 
 /// Creates a source. Sends nothing, except for `keepFresh` in the background. Throws
-/// `Tarnik::InvalidArgumentException` when there is no endpoint, for a malformed URL, for an https
-/// URL without an SSL context, when the token factory is null, for a login whose functions are not
-/// set or that lacks the holder-of-key configuration that it needs, for an unusable holder-of-key
-/// configuration (see `CreateSecurityTokenService`), and for a number that is outside its range.
+/// `Tarnik::InvalidArgumentException` when there is no endpoint, for a malformed URL, for https
+/// URLs beside http URLs, since a login must not reach the network in plain text when TLS fails,
+/// for an https URL without an SSL context, when the token factory is null, for a login whose
+/// functions are not set or that lacks the holder-of-key configuration that it needs, for an
+/// unusable holder-of-key configuration (see `CreateSecurityTokenService`), and for a number that
+/// is outside its range.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TokenSource> CreateTokenSource(TokenSourceConfig config);
 
 }  // namespace SsoClient::Access
