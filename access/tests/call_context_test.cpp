@@ -181,7 +181,7 @@ TEST(CancellationForkTest, ChildIsNotBlockedByALockOfTheParent) {
       }
     });
   }
-  for (int i = 0; i < 40; ++i) {
+  for (int i = 0; i < 20; ++i) {
     EXPECT_EQ(InChild([&] {
                 const auto own = source.Token().OnCancel([] {});
                 source.Cancel();

@@ -81,16 +81,16 @@ TEST_F(AccessExamplesTest, FailoverAsksTheNextServiceUntilOneDecides) {
   const std::string password = " <" + WritePassword(kPassword);
 
   const CommandResult run = RunExample("failover " + trust_ + " " + kUser + " " + nobody + " " +
-                                       broken.HttpUrl() + " " + Sts().HttpsUrl() + password);
+                                       broken.HttpUrl() + " " + Sts().HttpUrl() + password);
   EXPECT_EQ(run.status, 0);
   EXPECT_THAT(run.output,
               MatchesRegex("attempt 1 at " + nobody + "\nunreachable: [^\n]+\nattempt 2 at " +
                            broken.HttpUrl() + "\nhttp-status: [^\n]+\nattempt 3 at " +
-                           Sts().HttpsUrl() + "\na token valid until " + kEnd + "\n"));
+                           Sts().HttpUrl() + "\na token valid until " + kEnd + "\n"));
 
   const std::string wrong = " <" + WritePassword("wrong");
   const CommandResult refused = RunExample("failover " + trust_ + " " + kUser + " " + nobody + " " +
-                                           Sts().HttpsUrl() + " " + broken.HttpUrl() + wrong);
+                                           Sts().HttpUrl() + " " + broken.HttpUrl() + wrong);
   EXPECT_EQ(refused.status, 1);
   EXPECT_THAT(refused.output, HasSubstr("\nNo token: "));
   EXPECT_EQ(broken.Requests().size(), 1U);

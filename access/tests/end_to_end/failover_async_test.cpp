@@ -34,7 +34,7 @@ class BrokenEndpoint {
     sts_.SetMisbehavior(misbehavior);
     url_ = sts_.HttpsUrlFor("localhost");
   }
-  explicit BrokenEndpoint(int port) : url_("http://127.0.0.1:" + std::to_string(port) + "/sts") {}
+  explicit BrokenEndpoint(int port) : url_("https://127.0.0.1:" + std::to_string(port) + "/sts") {}
   virtual ~BrokenEndpoint() = default;
 
   const std::string& Url() const { return url_; }
