@@ -38,7 +38,7 @@ std::vector<BadConfig> BadConfigs() {
       "The fraction of the lifetime after which tokens are refreshed is not between 0 and 1.";
   const char* jitter = "The jitter of refreshes is not between 0 and 1.";
   const char* limit = "The limit of an attempt is not between 1 ms and 240 s.";
-  const char* delay = "A delay between attempts is negative.";
+  const char* delay = "A delay between attempts is not positive.";
   return {
       {"There is no endpoint.", [](auto& config) { config.endpoints.clear(); }},
       {"The token factory is null.", [](auto& config) { config.tokenFactory = nullptr; }},
@@ -65,8 +65,8 @@ std::vector<BadConfig> BadConfigs() {
        [](auto& config) { config.retry.attemptsAtOnce = 0; }},
       {limit, [](auto& config) { config.retry.attemptTimeout = milliseconds(0); }},
       {limit, [](auto& config) { config.retry.attemptTimeout = seconds(241); }},
-      {delay, [](auto& config) { config.retry.firstDelay = milliseconds(-1); }},
-      {delay, [](auto& config) { config.retry.longestDelay = milliseconds(-1); }},
+      {delay, [](auto& config) { config.retry.firstDelay = milliseconds(0); }},
+      {delay, [](auto& config) { config.retry.longestDelay = milliseconds(0); }},
       {"The longest Retry-After is negative.",
        [](auto& config) { config.retry.longestRetryAfter = milliseconds(-1); }},
       {"The number of failures after which an endpoint is left out is not positive.",

@@ -74,11 +74,11 @@ TEST_F(EndpointSetTest, ListedOrderBeginsAtTheFirstThatIsNotLeftOut) {
   constexpr auto kAsListed = EndpointSet::Order::kAsListed;
   const EndpointSet::Asked none(3);
   set.OnAnswer(2);
-  EXPECT_EQ(set.Admit(none, now, kAsListed).endpoint.value(), 0U);
+  EXPECT_EQ(set.TakePlace(none, now, kAsListed).value(), 0U);
   FailOnce(0);
   FailOnce(0);
-  EXPECT_EQ(set.Admit(none, now, kAsListed).endpoint.value(), 1U);
-  EXPECT_EQ(set.Admit(none, now).endpoint.value(), 2U);
+  EXPECT_EQ(set.TakePlace(none, now, kAsListed).value(), 1U);
+  EXPECT_EQ(set.TakePlace(none, now).value(), 2U);
 }
 
 TEST_F(EndpointSetTest, OpenCircuitsAreLeftOut) {
@@ -111,14 +111,14 @@ TEST_F(EndpointSetTest, ProbeChangesTheCircuit) {
 }
 
 TEST_F(EndpointSetTest, AbandonedAfterTheDeadlinesOfAllPrefersTheNext) {
-  set.OnAbandoned(0, false);
+  set.OnAbandoned(0);
   EXPECT_EQ(Order()[0], "https://a");
-  set.OnAbandoned(0, true);
+  set.AskLast(0);
   EXPECT_EQ(Order()[0], "https://b");
-  set.OnAbandoned(0, true);
+  set.AskLast(0);
   EXPECT_EQ(Order()[0], "https://b");
   set.OnAnswer(2);
-  set.OnAbandoned(2, true);
+  set.AskLast(2);
   EXPECT_EQ(Order()[0], "https://a");
 }
 

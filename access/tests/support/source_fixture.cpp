@@ -35,6 +35,11 @@ SourceFixture::SourceFixture() {
   ForAll(Issues(hours(1)));
 }
 
+void SourceFixture::UseCertificate() {
+  config.login = CertificateLogin{};
+  config.holderOfKey = HolderOfKeyConfig{Tarnik::MakeRef<NamedCertificate>("own"), nullptr};
+}
+
 void SourceFixture::Make() {
   const auto shared = std::make_shared<const TokenSourceConfig>(config);
   source = std::make_shared<TokenSourceImpl>([shared, runtime = runtime, scripts = scripts] {
