@@ -186,6 +186,8 @@ class BaseLifeTest : public ExchangeTest {
     inner.login = PasswordLogin{"alice", [] { return std::string("secret"); }};
     inner.endpoints.resize(1);
     inner.listener = nullptr;
+    // Not refreshed when it is used late.
+    inner.refresh = {0.99, 0};
     const auto shared = std::make_shared<const TokenSourceConfig>(std::move(inner));
     TokenLogin login;
     login.spec = SpecFor("https://base.example.com");
