@@ -34,7 +34,9 @@ struct AttemptOutcome {
   std::exception_ptr failure;
   FailureKind kind = FailureKind::kNone;
   std::string message;  ///< of the failure
-  int httpStatus = 0;   ///< of the last answer; 0 without one
+  /// For `kRefusedLogin`: the secret is the reason, and not perhaps the act-as token.
+  bool isAuthenticationRefused = false;
+  int httpStatus = 0;  ///< of the last answer; 0 without one
   std::chrono::milliseconds retryAfter{0};
   /// The service's clock minus this system's, from the `Date` of the last answer.
   boost::optional<std::chrono::milliseconds> clockOffset;

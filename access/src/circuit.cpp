@@ -36,6 +36,13 @@ void Circuit::OnFailure(Instant::Steady now, std::chrono::milliseconds retryAfte
   }
 }
 
+void Circuit::OnUnclear(Instant::Steady now, std::chrono::milliseconds retryAfter, double draw) {
+  OnAbandoned();
+  if (retryAfter > std::chrono::milliseconds(0)) {
+    retryAt_ = now + Backoff(config_, failures_ + 1, retryAfter, draw);
+  }
+}
+
 void Circuit::OnAbandoned() {
   if (state_ == CircuitState::kHalfOpen) {
     state_ = CircuitState::kOpen;

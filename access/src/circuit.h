@@ -32,6 +32,8 @@ class Circuit {
   void OnAnswer();
   /// No service has decided the attempt. `retryAfter` is what the endpoint asked for, or zero.
   void OnFailure(Instant::Steady now, std::chrono::milliseconds retryAfter, double draw);
+  /// The endpoint may or may not work. `retryAfter` as above.
+  void OnUnclear(Instant::Steady now, std::chrono::milliseconds retryAfter, double draw);
   /// The attempt ended without an outcome, since nobody waited for it any longer.
   void OnAbandoned();
 

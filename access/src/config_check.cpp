@@ -61,8 +61,8 @@ void CheckRetry(const RetryConfig& retry) {
   Require(retry.attemptsAtOnce >= 1, "The number of attempts at once is not positive.");
   Require(retry.attemptTimeout > kNone && retry.attemptTimeout <= kLongestAttempt,
           "The limit of an attempt is not between 1 ms and 240 s.");
-  Require(retry.firstDelay >= kNone && retry.longestDelay >= kNone,
-          "A delay between attempts is negative.");
+  Require(retry.firstDelay > kNone && retry.longestDelay > kNone,
+          "A delay between attempts is not positive.");
   Require(retry.longestRetryAfter >= kNone, "The longest Retry-After is negative.");
   Require(retry.failuresToOpen >= 1,
           "The number of failures after which an endpoint is left out is not positive.");

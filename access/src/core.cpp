@@ -62,7 +62,8 @@ Core::Core(Parts parts)
       expired_(Failure::Of(PasswordExpiredException("The password has expired."))),
       cache_(CapacityFor(*config_)),
       endpoints_(config_->retry, std::move(parts.clients)),
-      gate_(config_->retry.refusalMemory) {}
+      gate_(config_->retry, std::holds_alternative<PasswordLogin>(config_->login)),
+      refusedSpecs_(config_->cache.capacity, config_->retry.refusalMemory) {}
 
 Core::~Core() = default;
 
@@ -256,7 +257,8 @@ boost::optional<Answer> Core::AnswerAtOnce(const SpecView& spec, const WaiterPtr
     return Answer{std::move(hit.token), {}};
   }
   const EntryPtr entry = cache_.Peek(spec);
-  if (entry != nullptr && !entry->Life().HasEnded(now) && !entry->Life().IsGranted(minimumLife)) {
+  if (entry != nullptr && !entry->Life().HasEnded(now) && !entry->Life().endsWithBase &&
+      !entry->Life().IsGranted(minimumLife)) {
     return Answer{nullptr, TooShortFailure(entry->Life().granted, minimumLife)};
   }
   return boost::none;
@@ -275,7 +277,7 @@ bool Core::Withdraw(const WaiterPtr& waiter) noexcept {
     request->waiters.erase(waiter);
     --waiting_;
     if (request->waiters.empty() && !request->isBackground) {
-      Abandon(section, request, false);
+      Abandon(section, request, Leaving::kCancelled);
     }
   }
   if (timer != nullptr) {
@@ -296,7 +298,7 @@ void Core::Leave(const WaiterPtr& waiter, Leaving why) noexcept {
   request->waiters.erase(waiter);
   --waiting_;
   if (request->waiters.empty() && !request->isBackground) {
-    Abandon(section, request, isDeadline);
+    Abandon(section, request, why);
   }
 }
 
@@ -316,9 +318,22 @@ Failure Core::DeadlineFailure(const Request& request, const Waiter& waiter) cons
   });
 }
 
-void Core::Abandon(Section& section, const RequestPtr& request, bool hasWaitedInVain) noexcept {
-  request->hasWaitedInVain = hasWaitedInVain;
-  Detach(section, request);
+// Nobody waits for the request any longer.
+void Core::Abandon(Section& section, const RequestPtr& request, Leaving why) noexcept {
+  if (request->limit != nullptr && why == Leaving::kDeadline) {
+    endpoints_.AskLast(request->endpoint);
+  }
+  if (!IsVerdictNeeded(*request)) {
+    Detach(section, request);
+  }
+}
+
+// A password that was sent may be wrong. If the attempts were cancelled, each call could send it
+// once more, so this one goes on until it is decided, or until its limit. Those who come later for
+// the same token share it.
+bool Core::IsVerdictNeeded(const Request& request) const noexcept {
+  return request.sendsPassword && MayHaveSent(request.limit->Stage()) &&
+         !gate_.IsAccepted(*request.gate, runtime_->Now().steady);
 }
 
 void Core::GiveAll(Section& section, const RequestPtr& request, const Failure& failure) noexcept {
@@ -330,18 +345,26 @@ void Core::GiveAll(Section& section, const RequestPtr& request, const Failure& f
   request->waiters.clear();
 }
 
-void Core::GiveAll(Section& section, const RequestPtr& request, const CacheEntry& entry,
-                   const Instant& now) noexcept {
+// Gives the token to those for whom it lasts long enough.
+void Core::GiveUsable(Section& section, const RequestPtr& request, const CacheEntry& entry,
+                      const Instant& now) noexcept {
+  waiting_ -= std::erase_if(request->waiters, [&](const WaiterPtr& waiter) {
+    if (!entry.Life().IsUsable(now, waiter->Context().minimumLife)) {
+      return false;
+    }
+    waiter->request = nullptr;
+    section.GiveAnswer(waiter, {entry.Token(), {}});
+    return true;
+  });
+}
+
+void Core::GiveTooShort(Section& section, const RequestPtr& request,
+                        std::chrono::microseconds granted) noexcept {
   for (const WaiterPtr& waiter : request->waiters) {
     waiter->request = nullptr;
-    const std::chrono::seconds minimumLife = waiter->Context().minimumLife;
-    if (entry.Life().IsUsable(now, minimumLife)) {
-      section.GiveAnswer(waiter, {entry.Token(), {}});
-    } else {
-      section.GiveAnswer(waiter, {nullptr, Failure::Made([&] {
-                                    return TooShortFailure(entry.Life().granted, minimumLife);
-                                  })});
-    }
+    section.GiveAnswer(waiter, {nullptr, Failure::Made([&] {
+                                  return TooShortFailure(granted, waiter->Context().minimumLife);
+                                })});
   }
   waiting_ -= request->waiters.size();
   request->waiters.clear();
@@ -363,7 +386,8 @@ void Core::Invalidate(const SamlToken& token) {
   section.Keep(refused);
   cache_.Remove(SpecView(*refused->Key()));
   if (IsPinned(refused->Key())) {
-    schedule_.Set(refused->Key(), runtime_->Now().steady);
+    // The pause between background requests is for those that nobody has asked for.
+    schedule_.Set(refused->Key(), runtime_->Now().steady).notBefore = Instant::Steady::min();
     ArmTimer(section);
   } else {
     schedule_.Remove(refused->Key());
@@ -422,6 +446,7 @@ void Core::EndAll(State state, const Failure& failure) noexcept {
   section.Cancel(std::exchange(timer_, nullptr));
   cache_.ForEach([&section](const EntryPtr& entry) { section.Keep(entry); });
   cache_.Clear();
+  section.Keep(std::exchange(knownBase_, nullptr));
 }
 
 }  // namespace SsoClient::Access

@@ -17,6 +17,7 @@
 #include "endpoint_set.h"
 #include "login_gate.h"
 #include "refresh_schedule.h"
+#include "refused_specs.h"
 #include "request.h"
 #include "runtime.h"
 #include "secret.h"
@@ -98,10 +99,13 @@ class Core : public std::enable_shared_from_this<Core> {
   bool Withdraw(const WaiterPtr& waiter) noexcept;
   void Leave(const WaiterPtr& waiter, Leaving why) noexcept;
   Failure DeadlineFailure(const Request& request, const Waiter& waiter) const noexcept;
-  void Abandon(Section& section, const RequestPtr& request, bool hasWaitedInVain) noexcept;
+  void Abandon(Section& section, const RequestPtr& request, Leaving why) noexcept;
+  bool IsVerdictNeeded(const Request& request) const noexcept;
   void GiveAll(Section& section, const RequestPtr& request, const Failure& failure) noexcept;
-  void GiveAll(Section& section, const RequestPtr& request, const CacheEntry& entry,
-               const Instant& now) noexcept;
+  void GiveUsable(Section& section, const RequestPtr& request, const CacheEntry& entry,
+                  const Instant& now) noexcept;
+  void GiveTooShort(Section& section, const RequestPtr& request,
+                    std::chrono::microseconds granted) noexcept;
   void EndAll(State state, const Failure& failure) noexcept;
 
   // steps of requests: request_steps.cpp
@@ -112,15 +116,18 @@ class Core : public std::enable_shared_from_this<Core> {
   bool RunStep(const RequestPtr& request);
   bool Begin(const RequestPtr& request, Step& step);
   bool IsRenewable(const SamlToken& token) const;
+  std::chrono::seconds BaseLife(const Request& request) const noexcept;
+  bool MayLengthenBase(const Request& request) const noexcept;
   void RequestBase(const RequestPtr& request);
   void ReceiveBase(const RequestPtr& request, const Answer& answer) noexcept;
+  void NoteBase(Section& section, const std::shared_ptr<const SamlToken>& token) noexcept;
   bool RunLogin(const RequestPtr& request, Step& step);
   bool RunAttempt(const RequestPtr& request, Step& step, const std::string& secret);
   bool Admit(const RequestPtr& request, Step& step);
   bool MayLogIn(Section& section, const RequestPtr& request, const Step& step, const Instant& now);
-  Failure RememberedRefusal(const RequestPtr& request, const Step& step, const Instant& now);
-  void LeaveGate(Section& section, const RequestPtr& request, LoginVerdict verdict,
-                 const Failure& refusal, const Instant& now) noexcept;
+  Failure RememberedRefusal(const Request& request, const Step& step, const Instant& now) const;
+  void LeaveGate(Section& section, const RequestPtr& request, const LoginOutcome& outcome,
+                 const Instant& now) noexcept;
   void WithdrawFromGate(Section& section, const RequestPtr& request) noexcept;
   Result Perform(const Step& step, const Request& request, const std::string& secret) noexcept;
   Failure ToRemember(const Failure& failure, const std::string& secret) const noexcept;
@@ -140,22 +147,22 @@ class Core : public std::enable_shared_from_this<Core> {
   bool Conclude(const RequestPtr& request, Step& step, Result result);
   void NoteOutcome(Section& section, const RequestPtr& request, Step& step, Result& result,
                    const Instant& now) noexcept;
-  void NoteCircuit(Section& section, const RequestPtr& request, const Step& step,
-                   const Result& result, const Instant& now) noexcept;
+  void NoteCircuit(Section& section, const Step& step, const Result& result,
+                   const Instant& now) noexcept;
   void NoteClock(Section& section, const Step& step, const AttemptOutcome& outcome) noexcept;
-  LoginVerdict VerdictOf(FailureKind kind) const noexcept;
-  void Accept(Section& section, const RequestPtr& request, const Step& step,
+  LoginOutcome JudgeLogin(const Request& request, const Result& result) noexcept;
+  static bool IsRefusedForSpec(const Request& request, const AttemptOutcome& outcome) noexcept;
+  bool Accept(Section& section, const RequestPtr& request, const Step& step,
               const AttemptOutcome& outcome, const Instant& now);
   void ReportDeviations(Section& section, const Step& step, const AttemptOutcome& outcome) noexcept;
   bool GoOnAfterFailure(Section& section, const RequestPtr& request, const Step& step,
                         const Result& result, const Instant& now) noexcept;
   bool GoOnAfterDecision(Section& section, const RequestPtr& request, Step& step,
                          const Result& result, const Instant& now) noexcept;
-  void RememberRefusedExchange(const KeyPtr& key, const Failure& failure,
-                               const Instant& now) noexcept;
+  bool ReplaceBase(const RequestPtr& request, Step& step, const Instant& now) noexcept;
   int AttemptLimit(const Request& request) const noexcept;
   void EndRound(Section& section, const RequestPtr& request, const Instant& now) noexcept;
-  void Pause(Section& section, const RequestPtr& request, Instant::Steady until) noexcept;
+  bool Pause(Section& section, const RequestPtr& request, Instant::Steady until) noexcept;
   void Resume(const RequestPtr& request) noexcept;
   void FailUndecided(Section& section, const RequestPtr& request, const Instant& now) noexcept;
   Failure SummaryOf(const Request& request, const Instant& now) const;
@@ -171,6 +178,7 @@ class Core : public std::enable_shared_from_this<Core> {
   void RefreshInBackground(Section& section, const KeyPtr& key);
   EntryPtr Store(Section& section, const KeyPtr& key, const std::shared_ptr<const SamlToken>& token,
                  const TokenLife& life, const Instant& now);
+  EntryPtr KeepLonger(Section& section, const EntryPtr& entry, const Instant& now);
   void ScheduleAfterFailure(Section& section, const Request& request, const Failure& failure,
                             const Instant& now) noexcept;
   void EndOutage(Section& section, const Instant& now) noexcept;
@@ -198,11 +206,10 @@ class Core : public std::enable_shared_from_this<Core> {
   LoginGate gate_;
   TurnQueue turnsOfFunction_;
   int functionsUnderWay_ = 0;
-  struct Refusal {
-    Failure failure;
-    Instant::Steady until;
-  };
-  std::unordered_map<KeyPtr, Refusal, KeyHash, KeyEqual> refusedExchanges_;
+  RefusedSpecs refusedSpecs_;
+  /// The last token to exchange, and since when it is known, or when it was last replaced.
+  std::shared_ptr<const SamlToken> knownBase_;
+  Instant::Steady knownBaseSince_ = Instant::Steady::min();
   std::unordered_map<KeyPtr, RequestPtr, KeyHash, KeyEqual> requests_;
   std::size_t waiting_ = 0;
   RefreshSchedule schedule_;

@@ -95,13 +95,20 @@ EndpointSet::Change EndpointSet::OnFailure(Index index, const Reason& reason,
   return ChangeSince(before, index, now);
 }
 
-EndpointSet::Change EndpointSet::OnAbandoned(Index index, bool hasWaitedInVain) noexcept {
+EndpointSet::Change EndpointSet::OnUnclear(Index index, const Reason& reason,
+                                           milliseconds retryAfter, Instant::Steady now,
+                                           double draw) noexcept {
+  Member& member = members_[index];
+  const CircuitState before = member.circuit.State();
+  member.lastReason = reason;
+  member.circuit.OnUnclear(now, retryAfter, draw);
+  return ChangeSince(before, index, now);
+}
+
+EndpointSet::Change EndpointSet::OnAbandoned(Index index) noexcept {
   Member& member = members_[index];
   const CircuitState before = member.circuit.State();
   member.circuit.OnAbandoned();
-  if (hasWaitedInVain && preferred_ == index) {
-    preferred_ = (index + 1) % Size();
-  }
   return ChangeSince(before, index, {});
 }
 

@@ -59,9 +59,15 @@ class EndpointSet {
   Change OnAnswer(Index index, bool isPreferred = true) noexcept;
   Change OnFailure(Index index, const Reason& reason, std::chrono::milliseconds retryAfter,
                    Instant::Steady now, double draw) noexcept;
-  /// The attempt ended before the endpoint did anything. If the callers' deadlines had passed
-  /// before, another endpoint is preferred.
-  Change OnAbandoned(Index index, bool hasWaitedInVain) noexcept;
+  /// The endpoint has failed in a way that may concern this operation only.
+  Change OnUnclear(Index index, const Reason& reason, std::chrono::milliseconds retryAfter,
+                   Instant::Steady now, double draw) noexcept;
+  /// The attempt ended before the endpoint did anything.
+  Change OnAbandoned(Index index) noexcept;
+  /// Another endpoint is preferred until this one answers.
+  void AskLast(Index index) noexcept {
+    preferred_ = preferred_ == index ? (index + 1) % Size() : preferred_;
+  }
 
   /// When an endpoint with a closed circuit may be asked; not set when all circuits are open.
   boost::optional<Instant::Steady> ClosedAdmission() const noexcept;

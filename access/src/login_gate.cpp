@@ -1,5 +1,9 @@
 #include "login_gate.h"
 
+#include <algorithm>
+
+#include "backoff.h"
+
 namespace SsoClient::Access {
 
 namespace {
@@ -14,14 +18,24 @@ Failure LoginGate::RefusalOf(Tag tag, Instant::Steady now) const noexcept {
                                                                     : Failure();
 }
 
+Instant::Steady LoginGate::ClosedUntil(Tag tag) const noexcept {
+  const auto found = states_.find(tag);
+  return found == states_.end() ? Instant::Steady::min() : found->second.closedUntil;
+}
+
+bool LoginGate::IsAccepted(Tag tag, Instant::Steady now) const noexcept {
+  const auto found = states_.find(tag);
+  return found != states_.end() && now < found->second.acceptedUntil;
+}
+
 bool LoginGate::Enter(Tag tag, const RequestPtr& request, Instant::Steady now) {
   DropIdle(now);
   State& state = states_[tag];
-  if (now < state.acceptedUntil || state.holder == request) {
+  if (IsOpen(state, now) || IsHolder(state, request)) {
     return true;
   }
-  if (state.holder == nullptr) {
-    state.holder = request;
+  if (RequestPtr* const place = FreePlace(state, now)) {
+    *place = request;
     return true;
   }
   state.queue.push_back(request);
@@ -34,7 +48,39 @@ void LoginGate::Begin(Tag tag) noexcept {
   }
 }
 
-LoginGate::State* LoginGate::End(Tag tag, LoginVerdict verdict, const Failure& refusal,
+RequestPtr* LoginGate::FreePlace(State& state, Instant::Steady now) noexcept {
+  if (IsHeld(state) && now >= state.acceptedUntil) {
+    return nullptr;
+  }
+  const auto place = std::find(state.holders.begin(), state.holders.end(), nullptr);
+  return place == state.holders.end() ? nullptr : &*place;
+}
+
+bool LoginGate::IsHeld(const State& state) noexcept {
+  return std::any_of(state.holders.begin(), state.holders.end(),
+                     [](const RequestPtr& holder) { return holder != nullptr; });
+}
+
+bool LoginGate::IsHolder(const State& state, const RequestPtr& request) noexcept {
+  return std::find(state.holders.begin(), state.holders.end(), request) != state.holders.end();
+}
+
+bool LoginGate::Release(State& state, const RequestPtr& request) noexcept {
+  const auto found = std::find(state.holders.begin(), state.holders.end(), request);
+  if (found == state.holders.end()) {
+    return false;
+  }
+  *found = nullptr;
+  return true;
+}
+
+RequestPtr LoginGate::TakeFirst(State& state) noexcept {
+  RequestPtr first = std::move(state.queue.front());
+  state.queue.pop_front();
+  return first;
+}
+
+LoginGate::State* LoginGate::End(Tag tag, const LoginOutcome& outcome,
                                  Instant::Steady now) noexcept {
   const auto found = states_.find(tag);
   if (found == states_.end()) {
@@ -42,22 +88,45 @@ LoginGate::State* LoginGate::End(Tag tag, LoginVerdict verdict, const Failure& r
   }
   State& state = found->second;
   --state.underWay;
-  if (verdict == LoginVerdict::kAccepted) {
-    state.acceptedUntil = now + kAcceptedFor;
-    state.refusedUntil = Instant::Steady::min();
-  } else if (verdict == LoginVerdict::kRefused) {
-    state.acceptedUntil = Instant::Steady::min();
-    state.refusedUntil = now + refusalMemory_;
-    state.refusal = refusal;
+  switch (outcome.verdict) {
+    case LoginVerdict::kAccepted:
+      state.acceptedUntil = now + kAcceptedFor;
+      state.refusedUntil = Instant::Steady::min();
+      state.closedUntil = Instant::Steady::min();
+      state.unknown = 0;
+      break;
+    case LoginVerdict::kRefused:
+      state.acceptedUntil = Instant::Steady::min();
+      state.refusedUntil = now + config_.refusalMemory;
+      state.refusal = outcome.refusal;
+      state.unknown = 0;
+      break;
+    case LoginVerdict::kUnknown:
+      Close(state, outcome.draw, now);
+      break;
+    case LoginVerdict::kUndecided:
+      break;
   }
   return &state;
 }
 
-// Not the state of a login under way, which may be refused.
+// The next login with a password that was accepted must show whether it still is.
+void LoginGate::Close(State& state, double draw, Instant::Steady now) const noexcept {
+  if (now < state.acceptedUntil) {
+    state.acceptedUntil = Instant::Steady::min();
+    return;
+  }
+  state.closedUntil = now + Backoff(config_, ++state.unknown, std::chrono::milliseconds(0), draw);
+}
+
+// Not the state of a login under way, which may be refused. Unknown verdicts count for a while
+// longer, so that the pauses grow.
 void LoginGate::DropIdle(Instant::Steady now) {
-  std::erase_if(states_, [now](const auto& item) {
+  std::erase_if(states_, [this, now](const auto& item) {
     const State& state = item.second;
-    return state.underWay == 0 && state.holder == nullptr && state.queue.empty() &&
+    const bool isForgotten =
+        state.unknown == 0 || now - state.closedUntil >= 2 * config_.longestDelay;
+    return state.underWay == 0 && state.queue.empty() && !IsHeld(state) && isForgotten &&
            now >= state.acceptedUntil && now >= state.refusedUntil;
   });
 }

@@ -22,6 +22,8 @@ class RefreshSchedule {
     bool isOutage = false;  ///< no endpoint has decided the last one
     bool isPinned = false;  ///< refreshed although nobody asks
     Instant::Steady at = Instant::Steady::max();
+    /// When the next background request may begin.
+    Instant::Steady notBefore = Instant::Steady::min();
   };
 
   /// Adds the key if it is not there, and moves it to `at`. The reference is valid until the key is

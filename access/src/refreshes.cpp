@@ -16,6 +16,7 @@ using std::chrono::milliseconds;
 constexpr std::size_t kMaxBackgroundRequests = 8;
 // Each is then due later, or is no longer due; the timer fires again for the rest.
 constexpr std::size_t kKeysAtOnce = 64;
+// Between looks at a key, and between the background requests of one.
 constexpr std::chrono::seconds kNextLook{1};
 constexpr std::chrono::minutes kLookAfterEnd{10};
 
@@ -95,7 +96,13 @@ void Core::LookAt(Section& section, const KeyPtr& key, const Instant& now) {
     schedule_.Set(key, entry->Life().end.steady);
     return;
   }
+  RefreshSchedule::Item& item = *schedule_.Find(key);
+  if (now.steady < item.notBefore) {
+    schedule_.Set(key, item.notBefore);
+    return;
+  }
   RefreshInBackground(section, key);
+  item.notBefore = now.steady + kNextLook;
   // The end of the request sets another time, unless there is no memory for a timer then.
   Instant::Steady next = now.steady + config_->retry.longestDelay + kNextLook;
   if (entry != nullptr) {
@@ -114,7 +121,12 @@ void Core::RefreshInBackground(Section& section, const KeyPtr& key) {
 EntryPtr Core::Store(Section& section, const KeyPtr& key,
                      const std::shared_ptr<const SamlToken>& token, const TokenLife& life,
                      const Instant& now) {
-  section.Keep(cache_.Peek(SpecView(*key)));
+  const EntryPtr old = cache_.Peek(SpecView(*key));
+  if (old != nullptr && old->Life().IsUsable(now, std::chrono::seconds(0)) &&
+      life.end.steady < old->Life().end.steady) {
+    return KeepLonger(section, old, now);
+  }
+  section.Keep(old);
   auto entry = std::make_shared<CacheEntry>(key, token, life, now);
   // First, since a time for a token that is not in the cache does no harm.
   RefreshSchedule::Item& item = schedule_.Set(key, life.refreshAt);
@@ -127,6 +139,17 @@ EntryPtr Core::Store(Section& section, const KeyPtr& key,
     counters_.evictions.Add();
     schedule_.Remove(evicted->Key());
   }
+  ArmTimer(section);
+  return entry;
+}
+
+// The answer to a request that was abandoned may be older than the token in the cache, and a
+// service may grant less than before. The next refresh is in the middle of what is left.
+EntryPtr Core::KeepLonger(Section& section, const EntryPtr& entry, const Instant& now) {
+  const auto left = entry->Life().end.steady - now.steady;
+  RefreshSchedule::Item& item = schedule_.Set(entry->Key(), now.steady + left / 2);
+  item.failures = 0;
+  item.isOutage = false;
   ArmTimer(section);
   return entry;
 }
@@ -149,6 +172,7 @@ void Core::ScheduleAfterFailure(Section& section, const Request& request, const 
   if (entry != nullptr) {
     next = std::min(next, std::max(entry->Life().end.steady, now.steady));
   }
+  next = std::max(next, item->notBefore);
   schedule_.Set(request.key, next);
   ArmTimer(section);
   section.ToListener([&] {

@@ -1,6 +1,7 @@
 #ifndef SSOCLIENT_ACCESS_REQUEST_H
 #define SSOCLIENT_ACCESS_REQUEST_H
 
+#include <chrono>
 #include <memory>
 #include <optional>
 #include <unordered_set>
@@ -24,6 +25,9 @@ struct Request {
   explicit Request(KeyPtr k, bool isInBackground, std::size_t endpoints)
       : key(std::move(k)), isBackground(isInBackground), asked(endpoints), reasons(endpoints) {}
 
+  /// True for a request whose attempt goes on only to learn whether the password is accepted.
+  bool IsLeft() const noexcept { return !hasEnded && !isBackground && waiters.empty(); }
+
   const KeyPtr key;
   /// Goes on although nobody waits.
   const bool isBackground;
@@ -33,15 +37,22 @@ struct Request {
   EndpointSet::Index endpoint = 0;
   /// It has ended, or nobody waits for it: the thread that works for it drops what it has.
   bool hasEnded = false;
-  /// The callers that waited for it have left at their deadlines.
-  bool hasWaitedInVain = false;
+  /// The attempt under way is a login with a password.
+  bool sendsPassword = false;
+  /// It was cancelled when the password may have been sent.
+  bool isVerdictLost = false;
 
   bool mayRenew = true;
+  /// An endpoint that did not decide a renewal may decide a login.
+  bool wasRenewalSent = false;
   /// The tag of the secret whose gate it has or waits for.
   std::optional<LoginGate::Tag> gate;
   /// The token to exchange for `TokenLogin`, and whether the first one has been refused.
   std::shared_ptr<const SamlToken> base;
   bool hasReplacedBase = false;
+  /// How long the last one asked for had to be valid, and whether none is valid for that long.
+  std::chrono::seconds baseLife{0};
+  bool takesAnyBase = false;
   /// Ends the request for `base`.
   CancellationSource cancellation;
 
@@ -65,7 +76,6 @@ struct Request {
   Tarnik::Ref<Tarnik::Http::CallLimit> limit;
   /// The pause before the next round; null otherwise.
   Tarnik::Ref<Tarnik::System::CancellableItem> pause;
-  std::chrono::milliseconds retryAfter{0};
   /// The next one in the list of a section that is about to run this one.
   std::shared_ptr<Request> nextStarted;
   /// The same for one that has ended, and what is then cancelled.

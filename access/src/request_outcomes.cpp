@@ -17,6 +17,10 @@ namespace {
 
 using std::chrono::milliseconds;
 
+constexpr std::chrono::seconds kYoungBase{30};
+// A token ends with its base when the two ends differ by no more, since services round.
+constexpr std::chrono::microseconds kSameEnd = std::chrono::seconds(2);
+
 bool IsRefusal(FailureKind kind) noexcept {
   return kind == FailureKind::kRefusedLogin || kind == FailureKind::kExpiredPassword;
 }
@@ -44,9 +48,21 @@ bool IsOfService(const AttemptOutcome& outcome) noexcept {
          outcome.httpStatus != kUnauthorized;
 }
 
+// Whether another operation may succeed at the endpoint.
+bool MayHaveReached(FailureKind kind) noexcept {
+  return kind == FailureKind::kHttpStatus || kind == FailureKind::kTimedOut ||
+         kind == FailureKind::kCutOff;
+}
+
 GrantedPeriod PeriodOf(const SamlToken& token, milliseconds clockOffset) {
   return {std::chrono::microseconds(token.StartTime().GetUtcTime()),
           std::chrono::microseconds(token.ExpirationTime().GetUtcTime()), clockOffset};
+}
+
+bool EndTogether(const SamlToken& token, const SamlToken& base) {
+  const auto difference = std::chrono::microseconds(token.ExpirationTime().GetUtcTime() -
+                                                    base.ExpirationTime().GetUtcTime());
+  return difference <= kSameEnd && difference >= -kSameEnd;
 }
 
 // An exception of the class of `last` for several endpoints.
@@ -66,11 +82,15 @@ bool Core::Conclude(const RequestPtr& request, Step& step, Result result) {
     result.outcome.kind = FailureKind::kAbandoned;
   }
   NoteOutcome(section, request, step, result, now);
+  request->sendsPassword = false;
   if (result.outcome.token != nullptr) {
-    Accept(section, request, step, result.outcome, now);
-    return false;
+    return Accept(section, request, step, result.outcome, now);
   }
   if (request->hasEnded) {
+    return false;
+  }
+  if (request->IsLeft()) {
+    Fail(section, request, result.failure, now);
     return false;
   }
   return AllowsFailover(result.outcome.kind)
@@ -81,8 +101,8 @@ bool Core::Conclude(const RequestPtr& request, Step& step, Result result) {
 void Core::NoteOutcome(Section& section, const RequestPtr& request, Step& step, Result& result,
                        const Instant& now) noexcept {
   AttemptOutcome& outcome = result.outcome;
-  NoteCircuit(section, request, step, result, now);
-  LeaveGate(section, request, VerdictOf(outcome.kind), result.refusal, now);
+  NoteCircuit(section, step, result, now);
+  LeaveGate(section, request, JudgeLogin(*request, result), now);
   NoteClock(section, step, outcome);
   counters_.CountAttempt(outcome.kind);
   step.record.duration =
@@ -94,8 +114,8 @@ void Core::NoteOutcome(Section& section, const RequestPtr& request, Step& step, 
 }
 
 // The worker is free, and so is the place at the endpoint.
-void Core::NoteCircuit(Section& section, const RequestPtr& request, const Step& step,
-                       const Result& result, const Instant& now) noexcept {
+void Core::NoteCircuit(Section& section, const Step& step, const Result& result,
+                       const Instant& now) noexcept {
   const AttemptOutcome& outcome = result.outcome;
   endpoints_.ReturnPlace(step.endpoint);
   if (IsAnswer(outcome.kind)) {
@@ -107,21 +127,38 @@ void Core::NoteCircuit(Section& section, const RequestPtr& request, const Step& 
     if (change) {
       EndOutage(section, now);
     }
+  } else if (step.operation == AttemptOperation::kRenewal &&
+             outcome.kind == FailureKind::kHttpStatus) {
+    section.Circuit(endpoints_.OnUnclear(step.endpoint, result.reason, outcome.retryAfter,
+                                         now.steady, runtime_->Draw()));
   } else if (AllowsFailover(outcome.kind)) {
     section.Circuit(endpoints_.OnFailure(step.endpoint, result.reason, outcome.retryAfter,
                                          now.steady, runtime_->Draw()));
     WakeHopeless(section, now);
   } else {
-    section.Circuit(endpoints_.OnAbandoned(step.endpoint, request->hasWaitedInVain));
+    section.Circuit(endpoints_.OnAbandoned(step.endpoint));
   }
   ServeTurns(section, now);
 }
 
-LoginVerdict Core::VerdictOf(FailureKind kind) const noexcept {
+// The token to act as may be the reason, so that other specs are not refused.
+bool Core::IsRefusedForSpec(const Request& request, const AttemptOutcome& outcome) noexcept {
+  return outcome.kind == FailureKind::kRefusedLogin && !outcome.isAuthenticationRefused &&
+         request.key->spec.actAsToken.has_value();
+}
+
+LoginOutcome Core::JudgeLogin(const Request& request, const Result& result) noexcept {
+  const FailureKind kind = result.outcome.kind;
   if (kind == FailureKind::kNone) {
-    return LoginVerdict::kAccepted;
+    return {LoginVerdict::kAccepted};
   }
-  return IsRefusal(kind) ? LoginVerdict::kRefused : LoginVerdict::kUndecided;
+  if (IsRefusal(kind)) {
+    return IsRefusedForSpec(request, result.outcome)
+               ? LoginOutcome{}
+               : LoginOutcome{LoginVerdict::kRefused, result.refusal};
+  }
+  const bool isLost = request.sendsPassword && (request.IsLeft() || request.isVerdictLost);
+  return isLost ? LoginOutcome{LoginVerdict::kUnknown, {}, runtime_->Draw()} : LoginOutcome{};
 }
 
 void Core::NoteClock(Section& section, const Step& step, const AttemptOutcome& outcome) noexcept {
@@ -135,30 +172,40 @@ void Core::NoteClock(Section& section, const Step& step, const AttemptOutcome& o
   });
 }
 
-void Core::Accept(Section& section, const RequestPtr& request, const Step& step,
+// Returns whether another attempt follows at once.
+bool Core::Accept(Section& section, const RequestPtr& request, const Step& step,
                   const AttemptOutcome& outcome, const Instant& now) {
   counters_.CountSuccess(step.operation);
   if (state_ != State::kRunning) {
-    return;
+    return false;
   }
   ReportDeviations(section, step, outcome);
-  const TokenLife life = PlanTokenLife(
-      config_->refresh, PeriodOf(*outcome.token, endpoints_.ClockOffset(step.endpoint)), now,
-      runtime_->Draw());
+  TokenLife life = PlanTokenLife(config_->refresh,
+                                 PeriodOf(*outcome.token, endpoints_.ClockOffset(step.endpoint)),
+                                 now, runtime_->Draw());
   if (life.granted <= std::chrono::microseconds(0)) {
     if (!request->hasEnded) {
       const Failure ended =
           Failure::Of(SsoException("The service issued a token that has ended already."));
       Fail(section, request, ended.WithKind(FailureKind::kBadToken), now);
     }
-    return;
+    return false;
   }
-  refusedExchanges_.erase(request->key);
+  life.endsWithBase = step.base != nullptr && step.operation == AttemptOperation::kExchange &&
+                      EndTogether(*outcome.token, *step.base);
+  refusedSpecs_.Forget(request->key->spec, step.tag);
   const EntryPtr entry = Store(section, request->key, outcome.token, life, now);
-  if (!request->hasEnded) {
-    GiveAll(section, request, *entry, now);
-    Detach(section, request);
+  if (request->hasEnded) {
+    return false;
   }
+  GiveUsable(section, request, *entry, now);
+  if (life.endsWithBase && MayLengthenBase(*request)) {
+    request->base = nullptr;
+    return true;
+  }
+  GiveTooShort(section, request, life.granted);
+  Detach(section, request);
+  return false;
 }
 
 void Core::ReportDeviations(Section& section, const Step& step,
@@ -176,13 +223,25 @@ void Core::ReportDeviations(Section& section, const Step& step,
 
 bool Core::GoOnAfterFailure(Section& section, const RequestPtr& request, const Step& step,
                             const Result& result, const Instant& now) noexcept {
+  if (step.operation == AttemptOperation::kRenewal) {
+    request->wasRenewalSent |= MayHaveReached(result.outcome.kind);
+  }
   request->asked[step.endpoint] = true;
   request->reasons[step.endpoint] = result.reason;
   request->lastFailure = result.failure;
-  request->retryAfter = result.outcome.retryAfter;
   if (++request->undecided < AttemptLimit(*request) &&
       endpoints_.CanAdmit(request->asked, now.steady)) {
     return true;
+  }
+  // Each endpoint was asked once to renew the token. A login may succeed where that fails; but
+  // when none was reached, the next round tries it.
+  if (step.operation == AttemptOperation::kRenewal) {
+    request->mayRenew = false;
+    if (request->wasRenewalSent) {
+      request->undecided = 0;
+      std::fill(request->asked.begin(), request->asked.end(), false);
+      return true;
+    }
   }
   EndRound(section, request, now);
   return false;
@@ -194,27 +253,35 @@ bool Core::GoOnAfterDecision(Section& section, const RequestPtr& request, Step& 
     request->mayRenew = false;
     return true;
   }
-  if (step.operation == AttemptOperation::kExchange && IsRefusal(result.outcome.kind)) {
-    step.isBaseRefused = true;
-    if (!std::exchange(request->hasReplacedBase, true)) {
-      request->base = nullptr;
-      return true;
-    }
-    RememberRefusedExchange(request->key, result.failure, now);
+  const bool isExchange = step.operation == AttemptOperation::kExchange;
+  if (isExchange && IsRefusal(result.outcome.kind) && ReplaceBase(request, step, now)) {
+    return true;
+  }
+  const bool isForSpec =
+      isExchange ? IsRefusal(result.outcome.kind) : IsRefusedForSpec(*request, result.outcome);
+  if (isForSpec) {
+    refusedSpecs_.Remember(request->key->spec, step.tag, result.refusal, now.steady);
   }
   Fail(section, request, result.failure, now);
   return false;
 }
 
-// Without memory, it is asked for once more.
-void Core::RememberRefusedExchange(const KeyPtr& key, const Failure& failure,
-                                   const Instant& now) noexcept {
-  std::erase_if(refusedExchanges_,
-                [&now](const auto& item) { return now.steady >= item.second.until; });
-  try {
-    refusedExchanges_[key] = {failure, now.steady + config_->retry.refusalMemory};
-  } catch (const std::bad_alloc&) {
+// Whether the exchange is repeated with another token. Only one that has been known for a while is
+// thrown away: when its replacement is refused too, what it is exchanged for is the reason.
+bool Core::ReplaceBase(const RequestPtr& request, Step& step, const Instant& now) noexcept {
+  if (std::exchange(request->hasReplacedBase, true)) {
+    return false;
   }
+  request->base = nullptr;
+  if (knownBase_ != nullptr && knownBase_->Id() != step.base->Id()) {
+    return true;
+  }
+  if (knownBaseSince_ != Instant::Steady::min() && now.steady - knownBaseSince_ < kYoungBase) {
+    return false;
+  }
+  knownBaseSince_ = now.steady;
+  step.isBaseRefused = true;
+  return true;
 }
 
 // A refresh that nobody waits for asks each endpoint once, and is repeated later.
@@ -232,12 +299,18 @@ void Core::EndRound(Section& section, const RequestPtr& request, const Instant& 
     FailUndecided(section, request, now);
     return;
   }
+  // What an endpoint has asked for is in its circuit.
   const milliseconds pause =
-      Backoff(config_->retry, request->rounds, request->retryAfter, runtime_->Draw());
-  Pause(section, request, std::max(now.steady + pause, *admission));
+      Backoff(config_->retry, request->rounds, milliseconds(0), runtime_->Draw());
+  if (Pause(section, request, std::max(now.steady + pause, *admission))) {
+    ++request->rounds;
+    std::fill(request->asked.begin(), request->asked.end(), false);
+    request->base = nullptr;
+  }
 }
 
-void Core::Pause(Section& section, const RequestPtr& request, Instant::Steady until) noexcept {
+// Without memory, the request ends instead.
+bool Core::Pause(Section& section, const RequestPtr& request, Instant::Steady until) noexcept {
   try {
     request->pause =
         runtime_->RunAt(until, [core = weak_from_this(), weak = std::weak_ptr(request)] {
@@ -249,12 +322,10 @@ void Core::Pause(Section& section, const RequestPtr& request, Instant::Steady un
         });
   } catch (...) {
     Fail(section, request, Failure::Current(), runtime_->Now());
-    return;
+    return false;
   }
-  ++request->rounds;
-  std::fill(request->asked.begin(), request->asked.end(), false);
-  request->base = nullptr;
   request->stage = Stage::kPause;
+  return true;
 }
 
 void Core::Resume(const RequestPtr& request) noexcept {
@@ -306,6 +377,8 @@ void Core::Detach(Section& section, const RequestPtr& request) noexcept {
   // An attempt under way has the gate until it has ended.
   if (request->limit == nullptr) {
     WithdrawFromGate(section, request);
+  } else {
+    request->isVerdictLost = MayHaveSent(request->limit->Stage());
   }
   section.End(request);
   if (request->isBackground) {

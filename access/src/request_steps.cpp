@@ -1,3 +1,4 @@
+#include <algorithm>
 #include <exception>
 #include <string>
 #include <utility>
@@ -14,6 +15,10 @@
 namespace SsoClient::Access {
 
 namespace {
+
+// What a token to exchange loses of its life before the answer.
+constexpr std::chrono::seconds kTimeOfExchange{5};
+constexpr std::chrono::seconds kLongestBaseLife = std::chrono::hours(24 * 365 * 30);
 
 // The result of the function is constructed in the secret. Empty when the function throws.
 Secret FetchSecret(const PasswordLogin& login, Failure& failure) {
@@ -132,10 +137,29 @@ bool Core::IsRenewable(const SamlToken& token) const {
          IsSameCertificate(*certificate, *config_->holderOfKey->certificate);
 }
 
+// A token ends with the one that it is exchanged for, which must last for those who wait.
+std::chrono::seconds Core::BaseLife(const Request& request) const noexcept {
+  std::chrono::seconds life{0};
+  for (const WaiterPtr& waiter : request.waiters) {
+    life = std::max(life, std::min(waiter->Context().minimumLife, kLongestBaseLife));
+  }
+  return life == std::chrono::seconds(0) ? life : life + kTimeOfExchange;
+}
+
+// Whether those who still wait may be helped by another token to exchange.
+bool Core::MayLengthenBase(const Request& request) const noexcept {
+  return !request.waiters.empty() && !request.takesAnyBase && BaseLife(request) > request.baseLife;
+}
+
 void Core::RequestBase(const RequestPtr& request) {
   const auto& login = std::get<TokenLogin>(config_->login);
   CallContext context;
   context.cancellation = request->cancellation.Token();
+  {
+    const Section section(*this);
+    request->baseLife = request->takesAnyBase ? std::chrono::seconds(0) : BaseLife(*request);
+    context.minimumLife = request->baseLife;
+  }
   const auto receive = [self = shared_from_this(), request](const Answer& answer) {
     self->ReceiveBase(request, answer);
   };
@@ -156,6 +180,13 @@ void Core::ReceiveBase(const RequestPtr& request, const Answer& answer) noexcept
   if (request->hasEnded) {
     return;
   }
+  if (answer.failure.IsSet() && request->baseLife > std::chrono::seconds(0) &&
+      answer.failure.Kind() == FailureKind::kFault) {
+    // Those who need less, or the service, may do with a shorter one.
+    request->takesAnyBase = true;
+    section.Start(request);
+    return;
+  }
   if (answer.failure.IsSet()) {
     Fail(section, request, answer.failure, runtime_->Now());
     return;
@@ -167,8 +198,17 @@ void Core::ReceiveBase(const RequestPtr& request, const Answer& answer) noexcept
     Fail(section, request, empty.WithKind(FailureKind::kLocal), runtime_->Now());
     return;
   }
+  NoteBase(section, answer.token);
   request->base = answer.token;
   section.Start(request);
+}
+
+// When this token was first seen. Of the first one, nobody knows how old it is.
+void Core::NoteBase(Section& section, const std::shared_ptr<const SamlToken>& token) noexcept {
+  if (knownBase_ != nullptr && knownBase_->Id() != token->Id()) {
+    knownBaseSince_ = runtime_->Now().steady;
+  }
+  section.Keep(std::exchange(knownBase_, token));
 }
 
 bool Core::RunLogin(const RequestPtr& request, Step& step) {
@@ -277,6 +317,7 @@ bool Core::Admit(const RequestPtr& request, Step& step) {
   section.Circuit(endpoints_.Begin(step.endpoint, now.steady));
   if (request->gate) {
     gate_.Begin(*request->gate);
+    request->sendsPassword = std::holds_alternative<PasswordLogin>(config_->login);
   }
   request->limit = step.limit;
   request->stage = Stage::kAttempt;
@@ -292,7 +333,7 @@ bool Core::MayLogIn(Section& section, const RequestPtr& request, const Step& ste
   if (request->gate && (!isLogin || *request->gate != step.tag)) {
     WithdrawFromGate(section, request);
   }
-  const Failure refusal = RememberedRefusal(request, step, now);
+  const Failure refusal = RememberedRefusal(*request, step, now);
   if (refusal.IsSet()) {
     counters_.refusedFromMemory.Add(std::max<std::size_t>(request->waiters.size(), 1));
     Fail(section, request, refusal, now);
@@ -300,6 +341,12 @@ bool Core::MayLogIn(Section& section, const RequestPtr& request, const Step& ste
   }
   if (!isLogin) {
     return true;
+  }
+  if (const auto closedUntil = gate_.ClosedUntil(step.tag); now.steady < closedUntil) {
+    WithdrawFromGate(section, request);
+    ReturnPlace(section, request);
+    Pause(section, request, closedUntil);
+    return false;
   }
   const bool mayLogIn = gate_.Enter(step.tag, request, now.steady);
   request->gate = step.tag;
@@ -311,25 +358,23 @@ bool Core::MayLogIn(Section& section, const RequestPtr& request, const Step& ste
   return mayLogIn;
 }
 
-Failure Core::RememberedRefusal(const RequestPtr& request, const Step& step, const Instant& now) {
-  switch (step.operation) {
-    case AttemptOperation::kLogin:
-      return gate_.RefusalOf(step.tag, now.steady);
-    case AttemptOperation::kExchange: {
-      const auto found = refusedExchanges_.find(request->key);
-      const bool isKnown = found != refusedExchanges_.end() && now.steady < found->second.until;
-      return isKnown ? found->second.failure : Failure();
-    }
-    case AttemptOperation::kRenewal:
-      break;
+Failure Core::RememberedRefusal(const Request& request, const Step& step,
+                                const Instant& now) const {
+  if (step.operation == AttemptOperation::kRenewal) {
+    return {};
   }
-  return {};
+  if (step.operation == AttemptOperation::kLogin) {
+    if (Failure refusal = gate_.RefusalOf(step.tag, now.steady); refusal.IsSet()) {
+      return refusal;
+    }
+  }
+  return refusedSpecs_.Find(request.key->spec, step.tag, now.steady);
 }
 
-void Core::LeaveGate(Section& section, const RequestPtr& request, LoginVerdict verdict,
-                     const Failure& refusal, const Instant& now) noexcept {
+void Core::LeaveGate(Section& section, const RequestPtr& request, const LoginOutcome& outcome,
+                     const Instant& now) noexcept {
   if (request->gate) {
-    gate_.Leave(*request->gate, request, verdict, refusal, now.steady,
+    gate_.Leave(*request->gate, request, outcome, now.steady,
                 [&section](const RequestPtr& next) { section.Start(next); });
     request->gate.reset();
   }
@@ -337,7 +382,8 @@ void Core::LeaveGate(Section& section, const RequestPtr& request, LoginVerdict v
 
 void Core::WithdrawFromGate(Section& section, const RequestPtr& request) noexcept {
   if (request->gate) {
-    gate_.Withdraw(request, [&section](const RequestPtr& next) { section.Start(next); });
+    gate_.Withdraw(request, runtime_->Now().steady,
+                   [&section](const RequestPtr& next) { section.Start(next); });
     request->gate.reset();
   }
 }

@@ -50,4 +50,15 @@ std::string Describe(Stage stage, const std::string& url, ExchangeStage exchange
   return "a token";
 }
 
+bool MayHaveSent(ExchangeStage stage) noexcept {
+  switch (stage) {
+    case ExchangeStage::kLookUp:
+    case ExchangeStage::kConnection:
+    case ExchangeStage::kHandshake:
+      return false;
+    default:
+      return true;
+  }
+}
+
 }  // namespace SsoClient::Access

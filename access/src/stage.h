@@ -22,6 +22,10 @@ enum class Stage {
 /// What follows "was waiting for" in messages. `url` and `exchange` are those of the attempt.
 std::string Describe(Stage stage, const std::string& url, Tarnik::Http::ExchangeStage exchange);
 
+/// False while the attempt is before the first byte of its request. It computes before and after
+/// its exchange.
+bool MayHaveSent(Tarnik::Http::ExchangeStage stage) noexcept;
+
 }  // namespace SsoClient::Access
 
 #endif

@@ -52,7 +52,7 @@ TokenLife PlanTokenLife(const RefreshConfig& config, const GrantedPeriod& period
   const auto at = [&now](microseconds after) {
     return Instant{now.steady + after, now.wall + after};
   };
-  return {now.steady + std::min(refreshAfter, usable), at(usable), at(lifetime), lifetime};
+  return {now.steady + std::min(refreshAfter, usable), at(usable), at(lifetime), lifetime, false};
 }
 
 }  // namespace SsoClient::Access

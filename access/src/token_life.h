@@ -23,6 +23,8 @@ struct TokenLife {
   Instant usableUntil;  ///< the end less the margin
   Instant end;
   std::chrono::microseconds granted{0};  ///< what was left when the token was received
+  /// The token that it was exchanged for set its end.
+  bool endsWithBase = false;
 
   /// True when the token may be handed out to a caller that needs it for `minimumLife`; zero means
   /// the margin.

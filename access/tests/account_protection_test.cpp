@@ -243,6 +243,198 @@ TEST_F(AccountProtectionTest, AbandonedLoginKeepsTheGateUntilItHasEnded) {
   EXPECT_TRUE(Get(spec).Is<InvalidCredentialsException>());
 }
 
+// ---- tokens to act as
+
+class ActAsRefusalTest : public AccountProtectionTest {
+ protected:
+  // A service that refuses all tokens to act as.
+  void RefuseActAs(bool isAuthenticationRefused) {
+    ForAll([this, isAuthenticationRefused](const AttemptRequest& request, Limit&) {
+      if (!request.spec.actAsToken) {
+        return Issued(NewToken(hours(1)));
+      }
+      AttemptOutcome outcome = Refused();
+      outcome.isAuthenticationRefused = isAuthenticationRefused;
+      return outcome;
+    });
+  }
+  TokenSpec ActAs() {
+    TokenSpec made = spec;
+    made.actAsToken = std::shared_ptr<const SamlToken>(NewToken(hours(1)));
+    return made;
+  }
+};
+
+TEST_F(ActAsRefusalTest, IsRememberedForItsSpecOnly) {
+  RefuseActAs(false);
+  Make();
+  const TokenSpec bad = ActAs();
+  for (int i = 0; i < 5; ++i) {
+    EXPECT_TRUE(Get(bad).Is<InvalidCredentialsException>());
+  }
+  EXPECT_EQ(Attempts(), 1U);
+  EXPECT_NE(Get(spec).token, nullptr);
+  EXPECT_TRUE(Get(ActAs()).Is<InvalidCredentialsException>());
+  EXPECT_EQ(Attempts(), 3U);
+  password = "changed";
+  EXPECT_TRUE(Get(bad).Is<InvalidCredentialsException>());
+  EXPECT_EQ(Attempts(), 4U);
+  password = "secret";
+  runtime->Advance(minutes(5));
+  EXPECT_TRUE(Get(bad).Is<InvalidCredentialsException>());
+  EXPECT_EQ(Attempts(), 5U);
+}
+
+TEST_F(ActAsRefusalTest, OfThePasswordIsRememberedForThePassword) {
+  RefuseActAs(true);
+  Make();
+  EXPECT_TRUE(Get(ActAs()).Is<InvalidCredentialsException>());
+  EXPECT_TRUE(Get(spec).Is<InvalidCredentialsException>());
+  EXPECT_EQ(Attempts(), 1U);
+}
+
+// ---- logins that nobody waits for any longer
+
+class AbandonedLoginTest : public AccountProtectionTest {
+ protected:
+  // What a service does that answers after a time, unless the attempt is cancelled.
+  Script::Function AnswersAfter(milliseconds time, const AttemptOutcome& outcome) {
+    return [this, time, outcome](const AttemptRequest&, Limit& limit) {
+      for (milliseconds passed{0}; passed < time; passed += milliseconds(100)) {
+        if (limit.IsCancelled()) {
+          ++cancelled;
+          return Failed<CommunicationException>(FailureKind::kAbandoned, "Cancelled.");
+        }
+        runtime->Pass(milliseconds(100));
+      }
+      return outcome;
+    };
+  }
+  static AttemptOutcome Silence() {
+    return Failed<CommunicationException>(FailureKind::kTimedOut, "It is silent.");
+  }
+
+  int cancelled = 0;
+};
+
+TEST_F(AbandonedLoginTest, IsSentOnceAlthoughAllCallersLeaveBeforeTheRefusal) {
+  ForAll(AnswersAfter(seconds(2), Refused()));
+  Make();
+  const auto first = Ask(spec, Within(seconds(1)));
+  runtime->Settle();
+  EXPECT_EQ(first->Message(),
+            "The deadline passed while the call was waiting for the attempt at "
+            "https://a.example.com/sts.");
+  for (int i = 0; i < 10; ++i) {
+    EXPECT_TRUE(
+        Get(SpecFor(AudienceNumber(i)), Within(seconds(1))).Is<InvalidCredentialsException>());
+    runtime->Advance(seconds(1));
+  }
+  EXPECT_EQ(Attempts(), 1U);
+  EXPECT_EQ(cancelled, 0);
+  ASSERT_EQ(listener->Ended().size(), 1U);
+  EXPECT_EQ(listener->Ended()[0].failure, FailureKind::kRefusedLogin);
+}
+
+TEST_F(AbandonedLoginTest, CallerEndsAtItsDeadlineAndLaterOnesShareTheLogin) {
+  std::shared_ptr<Reply> later;
+  bool hadFirstEnded = false;
+  std::shared_ptr<Reply> first;
+  ForAll([&](const AttemptRequest&, Limit& limit) {
+    runtime->Pass(seconds(2));
+    hadFirstEnded = limit.IsCancelled() || first->failure != nullptr || runtime->WorkQueued() > 0;
+    later = Ask(spec, Within(seconds(5)));
+    EXPECT_FALSE(limit.IsCancelled());
+    return Issued(NewToken(hours(1)));
+  });
+  Make();
+  first = Ask(spec, Within(seconds(1)));
+  runtime->Settle();
+  EXPECT_TRUE(hadFirstEnded);
+  EXPECT_TRUE(first->Is<CommunicationException>());
+  EXPECT_NE(later->token, nullptr);
+  EXPECT_EQ(Attempts(), 1U);
+}
+
+TEST_F(AbandonedLoginTest, ServiceThatNeverDecidesIsAskedWithGrowingPauses) {
+  config.endpoints.resize(1);
+  config.retry.failuresToOpen = 1000;
+  ForAll(AnswersAfter(seconds(30), Silence()));
+  Make();
+  const auto begun = runtime->Now().steady;
+  for (int i = 0; i < 1000; ++i) {
+    const auto reply = Ask(SpecFor(AudienceNumber(i)), Within(seconds(1)));
+    runtime->Advance(seconds(2));
+    ASSERT_TRUE(reply->Is<CommunicationException>());
+  }
+  // Thirty seconds each, and then a pause of up to a minute.
+  const auto passed = std::chrono::duration_cast<seconds>(runtime->Now().steady - begun).count();
+  EXPECT_LE(static_cast<long>(Attempts()), passed / 70 + 6);
+  EXPECT_GE(static_cast<long>(Attempts()), passed / 100);
+  EXPECT_EQ(cancelled, 0);
+  // A call that waits long enough for the pause and the answer gets it.
+  ForAll(Issues(hours(1)));
+  const auto reply = Ask(spec, Within(minutes(2)));
+  runtime->Advance(minutes(2));
+  EXPECT_NE(reply->token, nullptr);
+}
+
+TEST_F(AbandonedLoginTest, IsCancelledWhenTheSecretWasAcceptedJustBefore) {
+  Make();
+  ASSERT_NE(Get(SpecFor("https://first.example.com")).token, nullptr);
+  ForAll(AnswersAfter(seconds(30), Silence()));
+  Get(spec, Within(seconds(1)));
+  EXPECT_EQ(cancelled, 1);
+  EXPECT_EQ(listener->Ended().back().failure, FailureKind::kAbandoned);
+  // The next one goes on, since the password may have been changed meanwhile.
+  Get(spec, Within(seconds(1)));
+  EXPECT_EQ(cancelled, 1);
+}
+
+TEST_F(AbandonedLoginTest, EndsWithStop) {
+  scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
+    runtime->Pass(seconds(2));
+    EXPECT_FALSE(limit.IsCancelled());
+    source->Stop(milliseconds(0));
+    EXPECT_TRUE(limit.IsCancelled());
+    return Failed<CommunicationException>(FailureKind::kAbandoned, "Cancelled.");
+  });
+  Make();
+  EXPECT_TRUE(Get(spec, Within(seconds(1))).Is<CommunicationException>());
+  EXPECT_EQ(Attempts(), 1U);
+  EXPECT_EQ(runtime->WorkQueued(), 0U);
+}
+
+TEST_F(AbandonedLoginTest, IsNotRepeatedWhenNoServiceHasDecided) {
+  scripts[0]->Set(AnswersAfter(seconds(2), Unreachable()));
+  Make();
+  Get(spec, Within(seconds(1)));
+  runtime->Advance(minutes(1));
+  EXPECT_EQ(Attempts(), 1U);
+}
+
+// ---- bursts
+
+TEST_F(AccountProtectionTest, BurstAfterTheServiceHasChangedThePasswordSendsTheOldOneTwice) {
+  Know("secret", Refused());
+  Make();
+  ASSERT_NE(Get(spec).token, nullptr);
+  runtime->Advance(seconds(5));
+  ForAll([&](const AttemptRequest&, Limit&) {
+    runtime->Settle();  // all others that may log in do so meanwhile
+    return Refused();
+  });
+  std::vector<std::shared_ptr<Reply>> replies;
+  for (int i = 0; i < 200; ++i) {
+    replies.push_back(Ask(SpecFor(AudienceNumber(i))));
+  }
+  runtime->Settle();
+  EXPECT_EQ(Attempts(), 1U + 2U);
+  for (const auto& reply : replies) {
+    EXPECT_TRUE(reply->Is<InvalidCredentialsException>());
+  }
+}
+
 }  // namespace
 
 }  // namespace SsoClient::Access::Testing

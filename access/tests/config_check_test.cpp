@@ -47,7 +47,7 @@ std::vector<BadConfig> BadConfigs() {
   const char* limit = "The limit of an attempt is not between 1 ms and 240 s.";
   const char* text =
       "The text holds what XML cannot carry: a control character or bytes that are not UTF-8.";
-  const char* delay = "A delay between attempts is negative.";
+  const char* delay = "A delay between attempts is not positive.";
   return {
       {"There is no endpoint.", [](auto& config) { config.endpoints.clear(); }},
       {"The token factory is null.", [](auto& config) { config.tokenFactory = nullptr; }},
@@ -74,8 +74,8 @@ std::vector<BadConfig> BadConfigs() {
        [](auto& config) { config.retry.attemptsAtOnce = 0; }},
       {limit, [](auto& config) { config.retry.attemptTimeout = milliseconds(0); }},
       {limit, [](auto& config) { config.retry.attemptTimeout = seconds(241); }},
-      {delay, [](auto& config) { config.retry.firstDelay = milliseconds(-1); }},
-      {delay, [](auto& config) { config.retry.longestDelay = milliseconds(-1); }},
+      {delay, [](auto& config) { config.retry.firstDelay = milliseconds(0); }},
+      {delay, [](auto& config) { config.retry.longestDelay = milliseconds(0); }},
       {"The longest Retry-After is negative.",
        [](auto& config) { config.retry.longestRetryAfter = milliseconds(-1); }},
       {"The number of failures after which an endpoint is left out is not positive.",

@@ -124,6 +124,7 @@ TEST_F(CoreTest, CallerThatLeavesAtItsDeadlineDoesNotEndTheExchangeOfOthers) {
 }
 
 TEST_F(CoreTest, LastCallerThatLeavesEndsTheExchange) {
+  UseCertificate();
   Make();
   std::vector<bool> cancelled;
   scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
@@ -232,6 +233,7 @@ TEST_F(CoreTest, DeadlineInAPauseSaysWhatHadFailed) {
 }
 
 TEST_F(CoreTest, TwoThousandAbandonedCallsLeaveNothing) {
+  UseCertificate();
   Make();
   scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
     runtime->Settle();
@@ -253,6 +255,56 @@ TEST_F(CoreTest, TwoThousandAbandonedCallsLeaveNothing) {
   EXPECT_EQ(runtime->WorkQueued(), 0U);
   EXPECT_EQ(source->Metrics().callersWaiting, 0U);
   scripts[0]->Set(Issues(hours(1)));
+  EXPECT_NE(Get(spec).token, nullptr);
+}
+
+TEST_F(CoreTest, LateAnswerOfAnAbandonedCallDoesNotReplaceALongerToken) {
+  UseCertificate();
+  Make();
+  Get(SpecFor("accepted"));
+  std::shared_ptr<const SamlToken> late;
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    late = NewToken(minutes(2));
+    runtime->Pass(seconds(2));  // the caller leaves, and another one gets a token meanwhile
+    ForAll(Issues(hours(1)));
+    EXPECT_NE(Get(spec).token, nullptr);
+    return Issued(late);
+  });
+  Get(spec, Within(seconds(1)));
+  const auto kept = source->TryGetToken(spec);
+  ASSERT_NE(kept, nullptr);
+  EXPECT_NE(kept, late);
+  // After `Invalidate`, any token is better.
+  source->Invalidate(*kept);
+  ForAll(Issues(minutes(1)));
+  EXPECT_NE(Get(spec).token, nullptr);
+}
+
+TEST_F(CoreTest, RefreshThatGrantsLessDoesNotReplaceALongerToken) {
+  Make();
+  const auto first = Get(spec).token;
+  source->TryGetToken(spec);
+  ForAll(Issues(seconds(1)));
+  runtime->Advance(minutes(55));
+  const std::size_t attempts = Attempts();
+  EXPECT_GE(attempts, 2U);
+  EXPECT_EQ(source->TryGetToken(spec), first);
+  runtime->Advance(minutes(4));
+  // Each in the middle of what is left.
+  EXPECT_LE(Attempts(), attempts + 5);
+  EXPECT_EQ(source->TryGetToken(spec), first);
+  // A longer one is welcome.
+  ForAll(Issues(hours(1)));
+  runtime->Advance(seconds(29));
+  EXPECT_NE(source->TryGetToken(spec), nullptr);
+  EXPECT_NE(source->TryGetToken(spec), first);
+}
+
+TEST_F(CoreTest, ShorterTokenReplacesOneThatIsNotHandedOutAnyLonger) {
+  Make();
+  Get(spec);
+  runtime->Advance(minutes(59) + seconds(31));
+  ForAll(Issues(seconds(10)));
   EXPECT_NE(Get(spec).token, nullptr);
 }
 

@@ -111,14 +111,14 @@ TEST_F(EndpointSetTest, ProbeChangesTheCircuit) {
 }
 
 TEST_F(EndpointSetTest, AbandonedAfterTheDeadlinesOfAllPrefersTheNext) {
-  set.OnAbandoned(0, false);
+  set.OnAbandoned(0);
   EXPECT_EQ(Order()[0], "https://a");
-  set.OnAbandoned(0, true);
+  set.AskLast(0);
   EXPECT_EQ(Order()[0], "https://b");
-  set.OnAbandoned(0, true);
+  set.AskLast(0);
   EXPECT_EQ(Order()[0], "https://b");
   set.OnAnswer(2);
-  set.OnAbandoned(2, true);
+  set.AskLast(2);
   EXPECT_EQ(Order()[0], "https://a");
 }
 

@@ -132,6 +132,132 @@ TEST_F(ExchangeTest, SourceThatReturnsNullIsAnError) {
   EXPECT_TRUE(Get(spec).Is<SsoException>());
 }
 
+TEST_F(ExchangeTest, RefusedExchangesReplaceTheTokenOnceInAWhile) {
+  base->next = std::make_shared<IssuedToken>("_new", 0, 1);
+  ForAll(Fails(Refused()));
+  Make();
+  for (int i = 0; i < 100; ++i) {
+    EXPECT_TRUE(Get(SpecFor(std::to_string(i))).Is<InvalidCredentialsException>());
+  }
+  EXPECT_EQ(base->invalidated, std::vector<std::string>{"_base"});
+  EXPECT_EQ(Attempts(), 101U);
+  base->next = std::make_shared<IssuedToken>("_newer", 0, 1);
+  runtime->Advance(seconds(30));
+  for (int i = 100; i < 200; ++i) {
+    Get(SpecFor(std::to_string(i)));
+  }
+  EXPECT_EQ(base->invalidated, (std::vector<std::string>{"_base", "_new"}));
+}
+
+TEST_F(ExchangeTest, TokenThatWasReplacedMeanwhileIsNotInvalidated) {
+  Make();
+  scripts[0]->Set([&](const AttemptRequest& request, Limit&) {
+    if (request.base->Id() != "_base") {
+      return Issued(NewToken(hours(1)));
+    }
+    base->token = std::make_shared<IssuedToken>("_new", 0, 1);
+    scripts[0]->Set(Issues(hours(1)));
+    EXPECT_NE(Get(SpecFor("https://other.example.com")).token, nullptr);
+    return Refused();
+  });
+  EXPECT_NE(Get(spec).token, nullptr);
+  EXPECT_TRUE(base->invalidated.empty());
+}
+
+// ---- the life of the token to exchange
+
+class BaseLifeTest : public ExchangeTest {
+ protected:
+  BaseLifeTest() {
+    // Ends with the token to exchange.
+    ForAll([this](const AttemptRequest& request, Limit&) {
+      const auto now = std::chrono::duration_cast<std::chrono::microseconds>(
+          runtime->Now().wall.time_since_epoch());
+      const std::chrono::microseconds end(request.base->ExpirationTime().GetUtcTime());
+      return Issued(NewToken(std::chrono::duration_cast<milliseconds>(end - now)));
+    });
+    UseSource(hours(1));
+  }
+
+  // An inner source of tokens with this lifetime.
+  void UseSource(milliseconds lifetime) {
+    innerScript->Set(Issues(lifetime));
+    TokenSourceConfig inner = config;
+    inner.login = PasswordLogin{"alice", [] { return std::string("secret"); }};
+    inner.endpoints.resize(1);
+    inner.listener = nullptr;
+    // Not refreshed when it is used late.
+    inner.refresh = {0.99, 0};
+    const auto shared = std::make_shared<const TokenSourceConfig>(std::move(inner));
+    TokenLogin login;
+    login.spec = SpecFor("https://base.example.com");
+    login.source =
+        std::make_shared<TokenSourceImpl>([shared, runtime = runtime, script = innerScript] {
+          Core::Parts parts;
+          parts.config = shared;
+          parts.runtime = runtime;
+          parts.clients.push_back(std::make_unique<ScriptedEndpoint>(shared->endpoints[0], script));
+          return parts;
+        });
+    config.login = login;
+  }
+  static CallContext For(std::chrono::seconds minimumLife) {
+    CallContext context;
+    context.minimumLife = minimumLife;
+    return context;
+  }
+
+  const std::shared_ptr<Script> innerScript = std::make_shared<Script>();
+};
+
+TEST_F(BaseLifeTest, IsLongEnoughForTheCallers) {
+  Make();
+  Get(spec);
+  runtime->Advance(minutes(57));
+  EXPECT_NE(Get(SpecFor("https://other.example.com"), For(minutes(5))).token, nullptr);
+  EXPECT_EQ(innerScript->Count(), 2U);
+}
+
+TEST_F(BaseLifeTest, IsLengthenedBeforeATokenIsTooShort) {
+  Make();
+  Get(spec);
+  runtime->Advance(minutes(57));
+  // Its token has three minutes, as the one in the cache of the other source.
+  EXPECT_NE(Get(SpecFor("https://other.example.com")).token, nullptr);
+  const Reply reply = Get(SpecFor("https://other.example.com"), For(minutes(5)));
+  EXPECT_NE(reply.token, nullptr) << reply.Message();
+}
+
+TEST_F(BaseLifeTest, IsLengthenedForACallerThatJoins) {
+  Make();
+  Get(spec);
+  runtime->Advance(minutes(57));
+  std::shared_ptr<Reply> joined;
+  const TokenSpec other = SpecFor("https://other.example.com");
+  scripts[0]->Set([&, isFirst = true](const AttemptRequest& request, Limit&) mutable {
+    if (std::exchange(isFirst, false)) {
+      joined = Ask(other, For(minutes(5)));
+    }
+    const auto now = std::chrono::duration_cast<std::chrono::microseconds>(
+        runtime->Now().wall.time_since_epoch());
+    const std::chrono::microseconds end(request.base->ExpirationTime().GetUtcTime());
+    return Issued(NewToken(std::chrono::duration_cast<milliseconds>(end - now)));
+  });
+  EXPECT_NE(Get(other).token, nullptr);
+  EXPECT_NE(joined->token, nullptr) << joined->Message();
+}
+
+TEST_F(BaseLifeTest, CallersThatNeedLessAreServedAlthoughNoBaseIsLongEnoughForOthers) {
+  Make();
+  const auto demanding = Ask(spec, For(hours(2)));
+  const auto modest = Ask(spec, For(minutes(5)));
+  runtime->Settle();
+  EXPECT_NE(modest->token, nullptr);
+  EXPECT_TRUE(demanding->Is<SsoException>());
+  EXPECT_EQ(demanding->Message(),
+            "The service grants 3600 s, but the caller needs a token for 7200 s.");
+}
+
 }  // namespace
 
 }  // namespace SsoClient::Access::Testing

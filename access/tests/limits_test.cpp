@@ -41,11 +41,12 @@ void AddExtremes(std::vector<Extreme>& extremes, const std::string& name, Field 
 
 template <class Rep, class Period>
 void AddExtremes(std::vector<Extreme>& extremes, const std::string& name,
-                 std::chrono::duration<Rep, Period>& (*field)(TokenSourceConfig&)) {
+                 std::chrono::duration<Rep, Period>& (*field)(TokenSourceConfig&),
+                 std::int64_t least = 0) {
   using Duration = std::chrono::duration<Rep, Period>;
   const auto add = [&](const char* value, Duration to) {
     const auto set = [field, to](TokenSourceConfig& config) { field(config) = to; };
-    extremes.push_back({name + " = " + value, set, to >= Duration(0)});
+    extremes.push_back({name + " = " + value, set, to >= Duration(least)});
   };
   add("smallest", Duration::min());
   add("-1", Duration(-1));
@@ -69,9 +70,9 @@ std::vector<Extreme> AllExtremes() {
   AddExtremes<>(
       all, "longestMargin", +[](Config& c) -> seconds& { return c.refresh.longestMargin; });
   AddExtremes<>(
-      all, "firstDelay", +[](Config& c) -> milliseconds& { return c.retry.firstDelay; });
+      all, "firstDelay", +[](Config& c) -> milliseconds& { return c.retry.firstDelay; }, 1);
   AddExtremes<>(
-      all, "longestDelay", +[](Config& c) -> milliseconds& { return c.retry.longestDelay; });
+      all, "longestDelay", +[](Config& c) -> milliseconds& { return c.retry.longestDelay; }, 1);
   AddExtremes<>(
       all, "longestRetryAfter",
       +[](Config& c) -> milliseconds& { return c.retry.longestRetryAfter; });

@@ -10,6 +10,7 @@ namespace SsoClient::Access {
 
 namespace {
 
+using std::chrono::milliseconds;
 using std::chrono::minutes;
 using std::chrono::seconds;
 
@@ -23,22 +24,26 @@ class LoginGateTest : public ::testing::Test {
  protected:
   Turns Leave(const RequestPtr& request, LoginVerdict verdict) {
     Turns turns;
+    LoginOutcome outcome;
+    outcome.verdict = verdict;
+    outcome.refusal = verdict == LoginVerdict::kRefused ? refusal : Failure();
     gate.Begin(1);
-    gate.Leave(1, request, verdict, verdict == LoginVerdict::kRefused ? refusal : Failure(), now,
+    gate.Leave(1, request, outcome, now,
                [&turns](const RequestPtr& next) { turns.push_back(next); });
     return turns;
   }
   Turns Withdraw(const RequestPtr& request) {
     Turns turns;
-    gate.Withdraw(request, [&turns](const RequestPtr& next) { turns.push_back(next); });
+    gate.Withdraw(request, now, [&turns](const RequestPtr& next) { turns.push_back(next); });
     return turns;
   }
 
-  LoginGate gate{minutes(5)};
+  LoginGate gate{RetryConfig(), true};
   Instant::Steady now{std::chrono::hours(1)};
   const RequestPtr a = MakeRequest();
   const RequestPtr b = MakeRequest();
   const RequestPtr c = MakeRequest();
+  const RequestPtr d = MakeRequest();
   const Failure refusal = Failure::Of(InvalidCredentialsException("Wrong."));
 };
 
@@ -61,6 +66,64 @@ TEST_F(LoginGateTest, AcceptedLoginReleasesAll) {
   EXPECT_EQ(Leave(a, LoginVerdict::kAccepted), (Turns{b, c}));
   EXPECT_TRUE(gate.Enter(1, b, now));
   EXPECT_TRUE(gate.Enter(1, c, now));
+}
+
+TEST_F(LoginGateTest, TwoPasswordsAreUnderWayWhileTheSecretCountsAsAccepted) {
+  gate.Enter(1, a, now);
+  Leave(a, LoginVerdict::kAccepted);
+  EXPECT_TRUE(gate.Enter(1, a, now));
+  EXPECT_TRUE(gate.Enter(1, b, now));
+  EXPECT_FALSE(gate.Enter(1, c, now));
+  EXPECT_FALSE(gate.Enter(1, d, now));
+  EXPECT_EQ(Leave(b, LoginVerdict::kAccepted), Turns{c});
+  EXPECT_EQ(Withdraw(a), Turns{d});
+}
+
+TEST_F(LoginGateTest, LoginsWithoutPasswordAreNotBoundedThen) {
+  LoginGate open(RetryConfig(), false);
+  EXPECT_TRUE(open.Enter(1, a, now));
+  EXPECT_FALSE(open.Enter(1, b, now));
+  open.Begin(1);
+  open.Leave(1, a, {LoginVerdict::kAccepted}, now, [](const RequestPtr&) {});
+  for (int i = 0; i < 100; ++i) {
+    EXPECT_TRUE(open.Enter(1, MakeRequest(), now));
+  }
+}
+
+TEST_F(LoginGateTest, UnknownVerdictClosesTheGateForAGrowingPause) {
+  gate.Enter(1, a, now);
+  gate.Enter(1, b, now);
+  gate.Enter(1, c, now);
+  EXPECT_LT(gate.ClosedUntil(1), now);
+  EXPECT_EQ(Leave(a, LoginVerdict::kUnknown), (Turns{b, c}));
+  EXPECT_EQ(gate.ClosedUntil(1) - now, milliseconds(250));
+  EXPECT_LT(gate.ClosedUntil(2), now);
+  for (const auto pause : {milliseconds(500), milliseconds(1000), milliseconds(2000)}) {
+    now = gate.ClosedUntil(1);
+    gate.Enter(2, c, now);  // which forgets what is idle
+    gate.Enter(1, b, now);
+    Leave(b, LoginVerdict::kUnknown);
+    EXPECT_EQ(gate.ClosedUntil(1) - now, pause);
+  }
+  now = gate.ClosedUntil(1);
+  gate.Enter(1, b, now);
+  Leave(b, LoginVerdict::kAccepted);
+  EXPECT_LT(gate.ClosedUntil(1), now);
+  now += minutes(1);
+  gate.Enter(1, b, now);
+  Leave(b, LoginVerdict::kUnknown);
+  EXPECT_EQ(gate.ClosedUntil(1) - now, milliseconds(250));
+}
+
+TEST_F(LoginGateTest, UnknownVerdictOfAnAcceptedSecretMakesTheNextLoginTheOnlyOne) {
+  gate.Enter(1, a, now);
+  Leave(a, LoginVerdict::kAccepted);
+  gate.Enter(1, a, now);
+  Leave(a, LoginVerdict::kUnknown);
+  EXPECT_LT(gate.ClosedUntil(1), now);
+  EXPECT_FALSE(gate.IsAccepted(1, now));
+  EXPECT_TRUE(gate.Enter(1, b, now));
+  EXPECT_FALSE(gate.Enter(1, c, now));
 }
 
 TEST_F(LoginGateTest, AcceptedSecretIsTriedAgainByOneAfterSomeSeconds) {
@@ -130,7 +193,7 @@ TEST_F(LoginGateTest, RefusalOfALongLoginIsRememberedAlthoughTheSecretWasAccepte
   gate.Begin(1);
   now += minutes(1);
   gate.Enter(2, b, now);  // which forgets what is idle
-  gate.Leave(1, a, LoginVerdict::kRefused, refusal, now, [](const RequestPtr&) {});
+  gate.Leave(1, a, {LoginVerdict::kRefused, refusal}, now, [](const RequestPtr&) {});
   EXPECT_TRUE(gate.RefusalOf(1, now).IsSet());
 }
 

@@ -125,6 +125,19 @@ TEST_F(FailoverTest, RetryAfterIsHonouredUpToTheLimit) {
   EXPECT_EQ(times[2] - times[1], seconds(20));
 }
 
+TEST_F(FailoverTest, RetryAfterOfOneEndpointDoesNotDelayTheOther) {
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    return scripts[0]->Count() == 1 ? Unreachable() : Issued(NewToken(hours(1)));
+  });
+  scripts[1]->Set(Fails(Unavailable(minutes(5))));
+  Make();
+  const auto reply = Ask(spec);
+  runtime->Advance(seconds(2));
+  ASSERT_TRUE(reply->Has());
+  EXPECT_NE(reply->token, nullptr);
+  EXPECT_EQ(scripts[1]->Count(), 1U);
+}
+
 TEST_F(FailoverTest, PauseIsNotShorterThanTheEndpointIsLeftOut) {
   config.endpoints.resize(1);
   config.retry.attempts = 2;
@@ -142,6 +155,7 @@ TEST_F(FailoverTest, PauseIsNotShorterThanTheEndpointIsLeftOut) {
 }
 
 TEST_F(FailoverTest, AttemptThatFailsAfterAllHaveLeftDoesNotCount) {
+  UseCertificate();
   config.endpoints.resize(1);
   config.retry.failuresToOpen = 1;
   scripts[0]->Set([&](const AttemptRequest&, Limit&) {
@@ -253,6 +267,7 @@ TEST_F(FailoverTest, DeadEndpointCostsOneAttemptABackOff) {
 }
 
 TEST_F(FailoverTest, EndpointThatIsSilentLongerThanAllDeadlinesIsAskedLast) {
+  UseCertificate();
   scripts[0]->Set([&](const AttemptRequest&, Limit&) {
     runtime->Pass(seconds(3));
     return Failed<CommunicationException>(FailureKind::kAbandoned, "Cancelled.");

@@ -195,6 +195,53 @@ TEST_F(RenewalTest, RenewalThatNoServiceDecidedIsRepeatedAtTheNextEndpoint) {
   EXPECT_EQ(scripts[1]->Seen()[0].operation, AttemptOperation::kRenewal);
 }
 
+TEST_F(RenewalTest, RenewalThatEachEndpointFailsToAnswerIsFollowedByALogin) {
+  for (const FailureKind kind :
+       {FailureKind::kHttpStatus, FailureKind::kTimedOut, FailureKind::kCutOff}) {
+    config.retry.failuresToOpen = kind == FailureKind::kHttpStatus ? 1 : 3;
+    const std::size_t before = scripts[0]->Count();
+    ForAll([&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+      return request.operation == AttemptOperation::kRenewal
+                 ? Failed<CommunicationException>(kind, "HTTP status 500.")
+                 : issue(request, limit);
+    });
+    Make();
+    const std::string id = RefreshOne();
+    ASSERT_EQ(scripts[0]->Count(), before + 3);
+    EXPECT_EQ(scripts[0]->Seen()[before + 1].operation, AttemptOperation::kRenewal);
+    EXPECT_EQ(scripts[0]->Seen()[before + 2].operation, AttemptOperation::kLogin);
+    EXPECT_EQ(scripts[1]->Seen().back().operation, AttemptOperation::kRenewal);
+    EXPECT_NE(source->TryGetToken(spec)->Id(), id);
+  }
+  EXPECT_TRUE(listener->Circuits().empty());
+}
+
+TEST_F(RenewalTest, CallersNeverNoticeThatNoRenewalIsAnswered) {
+  ForAll([&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+    return request.operation == AttemptOperation::kRenewal ? Unavailable(seconds(0))
+                                                           : issue(request, limit);
+  });
+  Make();
+  for (int i = 0; i < 12 * 60; ++i) {
+    ASSERT_NE(Get(spec, Within(seconds(4))).token, nullptr) << i;
+    runtime->Advance(minutes(1));
+  }
+  EXPECT_EQ(source->Metrics().misses, 1U);
+}
+
+TEST_F(RenewalTest, LoginFollowsAtOnceOnlyIfAnEndpointWasReached) {
+  Make();
+  RefreshOne();
+  runtime->Advance(seconds(1));
+  ForAll(Fails(Unreachable()));
+  const std::size_t before = Attempts();
+  source->TryGetToken(spec);
+  runtime->Advance(minutes(45));
+  ASSERT_GE(Attempts(), before + 2);
+  EXPECT_EQ(scripts[0]->Seen().back().operation, AttemptOperation::kRenewal);
+  EXPECT_EQ(scripts[1]->Seen().back().operation, AttemptOperation::kRenewal);
+}
+
 TEST_F(RenewalTest, RefusedRenewalIsNotARefusedLogin) {
   scripts[0]->Set(
       [&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {

@@ -128,6 +128,33 @@ TEST_P(SpacingTest, FirstSuccessEndsAnOutageAtOnceForAllKeys) {
 
 INSTANTIATE_TEST_SUITE_P(Chances, SpacingTest, ::testing::Values(Chance::kRandom, Chance::kLowest));
 
+// ---- the least pause between the background requests of one key
+
+class LeastPauseTest : public SourceFixture {};
+
+TEST_F(LeastPauseTest, TokensThatEndAtOnceCauseOneRefreshASecond) {
+  ForAll(Issues(milliseconds(2)));
+  config.keepFresh = {spec};
+  Make();
+  runtime->Settle();
+  const std::size_t before = Attempts();
+  runtime->Advance(seconds(20));
+  EXPECT_GE(Attempts(), before + 15);
+  EXPECT_LE(Attempts(), before + 20);
+}
+
+TEST_F(LeastPauseTest, RefreshesThatFailAtOnceAreASecondApart) {
+  config.retry.firstDelay = milliseconds(1);
+  config.retry.longestDelay = milliseconds(1);
+  config.keepFresh = {spec};
+  ForAll(Fails(Fault()));
+  Make();
+  runtime->Advance(milliseconds(9500));
+  EXPECT_EQ(Attempts(), 10U);
+  ASSERT_FALSE(listener->Refreshes().empty());
+  EXPECT_EQ(listener->Refreshes()[0].nextAttempt, seconds(1));
+}
+
 }  // namespace
 
 }  // namespace SsoClient::Access::Testing

@@ -103,6 +103,7 @@ TEST_F(StageMessageTest, AttemptNamesTheEndpointThatIsAsked) {
 }
 
 TEST_F(StageMessageTest, StageOfTheExchangeUnderWay) {
+  UseCertificate();
   const SilentService service;
   scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
     const auto connections = Tarnik::Http::CreateTCPConnectionSpec("127.0.0.1", service.Port());

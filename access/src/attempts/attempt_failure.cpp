@@ -25,13 +25,8 @@ const Class* As(const Tarnik::Exception& failure) noexcept {
 }
 
 FailureKind KindOfStatus(const Observation& seen) noexcept {
-  switch (seen.unreadFault) {
-    case UnreadFault::kRefusedLogin:
-      return FailureKind::kRefusedLogin;
-    case UnreadFault::kOther:
-      return FailureKind::kFault;
-    case UnreadFault::kNone:
-      break;
+  if (seen.fault != SeenFault::kNone) {
+    return IsRefusal(seen.fault) ? FailureKind::kRefusedLogin : FailureKind::kFault;
   }
   // RFC 9110, section 15.5.2. Asking another endpoint could lock the account.
   return seen.httpStatus == kUnauthorized ? FailureKind::kRefusedLogin : FailureKind::kHttpStatus;
@@ -56,6 +51,10 @@ FailureKind KindOfExchange(const AttemptEvidence& evidence) noexcept {
 }
 
 FailureKind KindOfAnswer(const Tarnik::Exception& failure, const Observation& seen) noexcept {
+  // The client knows these codes only in their namespaces.
+  if (IsRefusal(seen.fault)) {
+    return FailureKind::kRefusedLogin;
+  }
   const std::string_view message = failure.Message();
   if (message.starts_with(kUnexpectedFault)) {
     return FailureKind::kFault;
@@ -143,6 +142,8 @@ void SetFailure(AttemptOutcome& outcome, const std::exception_ptr& exception,
     outcome.kind = evidence.hasLoginFailed && !evidence.seen.hasSent ? FailureKind::kSecretFailed
                                                                      : FailureKind::kLocal;
   }
+  outcome.isAuthenticationRefused = outcome.kind == FailureKind::kRefusedLogin &&
+                                    evidence.seen.fault != SeenFault::kInvalidSecurityToken;
   // A service may repeat what it was sent.
   outcome.message = ToRecordText(HideSecret(MessageOf(outcome.failure), evidence.secret));
 }

@@ -40,26 +40,55 @@ std::string_view FaultCodeOf(const ElementNode& fault) {
   return name.substr(name.find(':') + 1);
 }
 
-UnreadFault Examine(const ElementNode& envelope) {
+SeenFault Examine(const ElementNode& envelope) {
   const ElementNode* fault = FindFault(envelope);
   if (fault == nullptr) {
-    return UnreadFault::kNone;
+    return SeenFault::kNone;
   }
   const std::string_view code = FaultCodeOf(*fault);
-  return code == "FailedAuthentication" || code == "InvalidSecurityToken"
-             ? UnreadFault::kRefusedLogin
-             : UnreadFault::kOther;
+  if (code == "FailedAuthentication") {
+    return SeenFault::kFailedAuthentication;
+  }
+  return code == "InvalidSecurityToken" ? SeenFault::kInvalidSecurityToken : SeenFault::kOther;
 }
 
-UnreadFault Examine(Tarnik::Reader* body) {
+SeenFault Examine(Tarnik::Reader* body) {
   try {
     const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
     const auto document = Tarnik::Xml::CreateXMLParser(body, handler.get())->Parse();
     return Examine(*Tarnik::CheckedCast<Tarnik::Xml::Document>(document.get())->RootElement());
   } catch (const Tarnik::Exception&) {
-    return UnreadFault::kNone;  // not an XML document
+    return SeenFault::kNone;  // not an XML document
   }
 }
+
+std::string ReadAll(Tarnik::Reader& body) {
+  std::string text;
+  char buffer[4096];
+  while (const std::size_t size = body.Read(buffer, sizeof buffer)) {
+    text.append(buffer, size);
+  }
+  return text;
+}
+
+/// An answer whose body was read, and can be read again.
+class ReadResponse final : public ClientResponse, public Tarnik::ObjectImpl {
+ public:
+  ReadResponse(Ref<ClientResponse> inner, std::string body)
+      : inner_(std::move(inner)), body_(Tarnik::CreateStringReader(std::move(body))) {}
+
+  const Tarnik::Http::StatusLine& Status() const override { return inner_->Status(); }
+  std::optional<std::string> Header(const std::string& name) const override {
+    return inner_->Header(name);
+  }
+  Ref<Tarnik::Reader> Body() const override { return body_; }
+
+ private:
+  ~ReadResponse() override = default;
+
+  const Ref<ClientResponse> inner_;
+  const Ref<Tarnik::Reader> body_;
+};
 
 class ObservingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::ObjectImpl {
  public:
@@ -78,7 +107,7 @@ class ObservingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::
     try {
       Ref<ClientResponse> response = inner_->Wait(item, timeoutMicroseconds);
       Note(*response);
-      return response;
+      return NoteFault(std::move(response));
     } catch (const Tarnik::Exception& failure) {
       seen_.failure = failure.Clone();
       throw;
@@ -96,8 +125,17 @@ class ObservingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::
     const WallTime serviceNow = seen_.clock ? received + seen_.clock->offset : received;
     seen_.retryAfter =
         retryAfter ? ParseRetryAfter(*retryAfter, serviceNow) : std::chrono::milliseconds(0);
-    seen_.unreadFault =
-        IsReadStatus(seen_.httpStatus) ? UnreadFault::kNone : Examine(response.Body().get());
+  }
+
+  // The client reads the body after this.
+  Ref<ClientResponse> NoteFault(Ref<ClientResponse> response) {
+    seen_.fault = SeenFault::kNone;
+    std::string body = ReadAll(*response->Body());
+    if (body.find("Fault") != std::string::npos) {
+      // The copy is cleansed as the original.
+      seen_.fault = Examine(Tarnik::CreateStringReader(body).get());
+    }
+    return Tarnik::MakeRef<ReadResponse>(std::move(response), std::move(body));
   }
 
   void NoteClock(const ClientResponse& response, WallTime received) {
@@ -114,6 +152,10 @@ class ObservingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::
 };
 
 }  // namespace
+
+bool IsRefusal(SeenFault fault) noexcept {
+  return fault == SeenFault::kFailedAuthentication || fault == SeenFault::kInvalidSecurityToken;
+}
 
 bool IsReadStatus(int httpStatus) noexcept {
   return httpStatus == 500 || (httpStatus >= 200 && httpStatus <= 299);

@@ -21,16 +21,20 @@ struct ClockReading {
   std::chrono::milliseconds offset;
 };
 
-/// A SOAP fault in an answer whose body the client does not read, because of its HTTP status.
-enum class UnreadFault { kNone, kRefusedLogin, kOther };
+/// The SOAP fault in an answer, also in one whose body the client does not read because of its HTTP
+/// status. The namespace of the code does not matter, since services confuse them.
+enum class SeenFault { kNone, kFailedAuthentication, kInvalidSecurityToken, kOther };
+
+/// Whether the fault refuses the credentials or the token of the request.
+bool IsRefusal(SeenFault fault) noexcept;
 
 /// What the exchanges of one attempt have shown. Used by the thread that makes the attempt.
 struct Observation {
   bool hasSent = false;
   /// Why the last exchange failed; null if it was answered.
   std::shared_ptr<const Tarnik::Throwable> failure;
-  int httpStatus = 0;  ///< of the last answer; 0 without one
-  UnreadFault unreadFault = UnreadFault::kNone;
+  int httpStatus = 0;                       ///< of the last answer; 0 without one
+  SeenFault fault = SeenFault::kNone;       ///< of the last answer
   std::chrono::milliseconds retryAfter{0};  ///< what the last answer asked for
   std::optional<ClockReading> clock;        ///< of the last answer with a Date
 };

@@ -239,6 +239,38 @@ TEST_F(AttemptFailureTest, FaultsWithAStatusThatTheClientDoesNotRead) {
   }
 }
 
+TEST_F(AttemptFailureTest, RefusalsWithCodesOfOtherNamespacesAreRefusedLogins) {
+  constexpr char kSecurity[] =
+      "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
+  for (const char* codeNamespace : {kSecurity, "urn:other"}) {
+    for (const int status : {200, 500}) {
+      AnswerWith(Fault(codeNamespace, "FailedAuthentication", status));
+      const AttemptOutcome outcome = AttemptHere();
+      EXPECT_THAT(ExpectFailure<SsoException>(outcome, FailureKind::kRefusedLogin),
+                  StartsWith("Unexpected SOAP fault: "));
+      EXPECT_TRUE(outcome.isAuthenticationRefused);
+    }
+  }
+  AnswerWith(DevSts::HttpAnswer{
+      500,
+      "Error",
+      {},
+      "<e:Envelope xmlns:e='http://schemas.xmlsoap.org/soap/envelope/'><e:Body><e:Fault>"
+      "<faultcode>undeclared:FailedAuthentication</faultcode></e:Fault></e:Body></e:Envelope>"});
+  ExpectFailure<ParseException>(AttemptHere(), FailureKind::kRefusedLogin);
+}
+
+TEST_F(AttemptFailureTest, ARefusedTokenIsNotARefusedSecret) {
+  for (const int status : {200, 403, 500}) {
+    AnswerWith(Fault(kTrust, "InvalidSecurityToken", status));
+    EXPECT_FALSE(AttemptHere().isAuthenticationRefused) << status;
+    AnswerWith(Fault(kTrust, "FailedAuthentication", status));
+    EXPECT_TRUE(AttemptHere().isAuthenticationRefused) << status;
+  }
+  AnswerWith(DevSts::HttpAnswer{401, "Unauthorized", {}, "who are you?"});
+  EXPECT_TRUE(AttemptHere().isAuthenticationRefused);
+}
+
 TEST_F(AttemptFailureTest, AnUnauthorizedRequestIsARefusedLogin) {
   AnswerWith(DevSts::HttpAnswer{401, "Unauthorized", {}, "who are you?"});
   ExpectFailure<CommunicationException>(AttemptHere(), FailureKind::kRefusedLogin);

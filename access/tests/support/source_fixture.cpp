@@ -37,6 +37,11 @@ SourceFixture::SourceFixture() {
   ForAll(Issues(hours(1)));
 }
 
+void SourceFixture::UseCertificate() {
+  config.login = CertificateLogin{};
+  config.holderOfKey = HolderOfKeyConfig{Tarnik::MakeRef<NamedCertificate>("own"), nullptr};
+}
+
 void SourceFixture::Make() {
   TokenSourceConfig limited = config;
   LimitDurations(limited);

@@ -39,6 +39,8 @@ class SourceFixture : public ::testing::Test {
  protected:
   SourceFixture();
 
+  /// Attempts of these logins are cancelled when all callers have left; see `AbandonedLoginTest`.
+  void UseCertificate();
   /// Makes the source with as many endpoints as `config` has.
   void Make();
   /// A token from now on.

@@ -8,21 +8,22 @@ namespace SsoClient::Access {
 
 /// Why an attempt to get a token failed, for programs. Kinds may be added in later versions.
 enum class FailureKind {
-  kNone,             ///< it did not fail
-  kUnreachable,      ///< no address for the host, connection refused or reset, or no route
-  kTlsTrust,         ///< the service's certificate is not trusted, expired or revoked
-  kTlsName,          ///< the service's certificate is for another name
-  kTls,              ///< any other failure of TLS
-  kTimedOut,         ///< the endpoint did not answer within the limit of an attempt
-  kCutOff,           ///< the connection ended before the answer did
-  kHttpStatus,       ///< an HTTP status other than 2xx and 401, without a SOAP fault
-  kBadAnswer,        ///< an answer that violates HTTP or is not what WS-Trust specifies
-  kFault,            ///< a SOAP fault, except a refused login
-  kRefusedLogin,     ///< the service refused the credentials, by a fault or the HTTP status 401
+  kNone,          ///< it did not fail
+  kUnreachable,   ///< no address for the host, connection refused or reset, or no route
+  kTlsTrust,      ///< the service's certificate is not trusted, expired or revoked
+  kTlsName,       ///< the service's certificate is for another name
+  kTls,           ///< any other failure of TLS
+  kTimedOut,      ///< the endpoint did not answer within the limit of an attempt
+  kCutOff,        ///< the connection ended before the answer did
+  kHttpStatus,    ///< an HTTP status other than 2xx and 401, without a SOAP fault
+  kBadAnswer,     ///< an answer that violates HTTP or is not what WS-Trust specifies
+  kFault,         ///< a SOAP fault, except a refused login
+  kRefusedLogin,  ///< the service refused the credentials, by the HTTP status 401 or a fault with
+                  ///< the code `FailedAuthentication` or `InvalidSecurityToken` of any namespace
   kExpiredPassword,  ///< the service refused the password because it has expired
   kBadToken,         ///< the service issued a token that was not accepted
   kSecretFailed,     ///< a function of the login threw, before anything was sent
-  kAbandoned,        ///< nobody waited for it any longer: deadlines, cancellation or `Stop`
+  kAbandoned,        ///< it was cancelled, since nobody waited for it any longer, or by `Stop`
   kLocal,            ///< another failure on this side: an argument, a key, threads or memory, or a
                      ///< later leg of a negotiation
 };

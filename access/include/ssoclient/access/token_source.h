@@ -45,32 +45,37 @@ struct RefreshConfig {
 /// How attempts are limited and repeated. A refused login is never repeated.
 struct RetryConfig {
   /// The attempts of one request, at all endpoints together; at least 1. Each endpoint is asked
-  /// once without delay; then there is a pause before each further round.
+  /// once without delay; then there is a pause before each further round. When a renewal is
+  /// followed by a login, the attempts to renew do not count.
   int attempts = 4;
   /// The attempts of the source that are under way at once; at least 1. Each endpoint has an equal
   /// share of them, and at least one, so that an endpoint that does not answer leaves room for the
-  /// others. As many calls of the login's function run at once. Each occupies a worker thread of
-  /// the platform's pool, which has 256 for all sources of the process. Further requests ask
-  /// another endpoint if they may, or else wait for their turn without a thread, first come first
-  /// served.
+  /// others. As many calls of the login's function run at once, but at most two logins by password
+  /// (see `TokenSource`). Each occupies a worker thread of the platform's pool, which has 256 for
+  /// all sources of the process. Further requests ask another endpoint if they may, or else wait
+  /// for their turn without a thread, first come first served.
   int attemptsAtOnce = 64;
   /// The limit of one attempt, from the look-up of the host to the last byte of the answer (of the
   /// last leg, for a negotiation). At most 240 seconds, the limit of the client.
   std::chrono::milliseconds attemptTimeout{std::chrono::seconds{30}};
   /// The pause before round n is random between half of and all of `firstDelay` * 2^(n-2), limited
-  /// to `longestDelay`. The pauses between the refreshes of a key while they fail, and between the
-  /// probes of an endpoint, grow in the same way. So with the defaults, after the first minute of
-  /// an outage, an endpoint that is down receives at most 120 requests an hour from the source, and
-  /// 80 on average, whatever the number of keys and of callers; and a service that refuses the
-  /// refreshes of a key receives at most 120 for it. Callers that wait for less than an attempt of
-  /// an endpoint takes to fail are not limited in this way.
+  /// to `longestDelay`; both are positive. The pauses between the refreshes of a key while they
+  /// fail, and between the probes of an endpoint, grow in the same way; the background requests for
+  /// one key are at least a second apart, whatever these values and the lifetimes of its tokens
+  /// are. So with the defaults, after the first minute of an outage, an endpoint that is down
+  /// receives at most 120 requests an hour from the source, and 80 on average, whatever the number
+  /// of keys and of callers; and a service that refuses the refreshes of a key receives at most 120
+  /// for it. Callers that wait for less than an attempt of an endpoint takes to fail are not
+  /// limited in this way.
   std::chrono::milliseconds firstDelay{500};
   std::chrono::milliseconds longestDelay{std::chrono::minutes{1}};
-  /// A longer `Retry-After` of the service counts as this.
+  /// A longer `Retry-After` of an endpoint counts as this. Until then it is left out, and others
+  /// are asked.
   std::chrono::milliseconds longestRetryAfter{std::chrono::minutes{5}};
   /// Consecutive failures after which an endpoint is left out until a probe succeeds; at least 1.
-  /// Attempts that nobody waited for any longer do not count; but when the deadlines of all callers
-  /// have passed in one, the next request begins at another endpoint.
+  /// Attempts that are cancelled do not count, nor does an HTTP status in answer to a renewal; but
+  /// when the deadlines of all callers have passed in one, the next request begins at another
+  /// endpoint.
   int failuresToOpen = 3;
   /// How long a refused login is answered from memory, unless the secret changes.
   std::chrono::seconds refusalMemory{std::chrono::minutes{5}};
@@ -136,16 +141,17 @@ struct TokenSourceMetrics {
 ///
 /// Callers that need the same token share one request, which has its own limits (`RetryConfig`).
 /// It ends when the last of them has given up, so that nothing is left running that nobody waits
-/// for; name tokens that callers with short deadlines need in `TokenSourceConfig::keepFresh`. A
-/// failure of a request is the failure of all callers that wait for it, and is not kept, except a
-/// refused login.
+/// for, except a login with a password that may be wrong (see below); name tokens that callers with
+/// short deadlines need in `TokenSourceConfig::keepFresh`. A failure of a request is the failure of
+/// all callers that wait for it, and is not kept, except a refused login.
 ///
 /// A token is replaced in the background when a part of its lifetime has passed (`RefreshConfig`):
 /// it is renewed if it is renewable and bound to the key of this source, and otherwise, or when the
-/// renewal fails, there is a new login. While that fails, the last token is served for as long as
-/// it has its margin. A token that was not asked for since its last refresh is not refreshed, and
-/// leaves the cache at its end. The lifetime that counts is the one that the service granted, by
-/// the service's clock.
+/// renewal is refused or each endpoint has failed to answer it, there is a new login. While that
+/// fails, the last token is served for as long as it has its margin. A new token replaces only one
+/// that ends earlier or is not handed out any longer. A token that was not asked for since its last
+/// refresh is not refreshed, and leaves the cache at its end. The lifetime that counts is the one
+/// that the service granted, by the service's clock.
 ///
 /// Requests go to the endpoint that answered last. When it fails in a way that no service has
 /// decided (`AllowsFailover`), the next one is asked; an endpoint that fails repeatedly is left out
@@ -157,10 +163,23 @@ struct TokenSourceMetrics {
 ///
 /// A refused login reaches one endpoint once, however many callers and specs there are: until a
 /// login has succeeded with a secret, only one is under way, and again when the last success was
-/// more than ten seconds ago. The refusal is then answered from memory, with the same exception
-/// class and message, until the secret changes or `RetryConfig::refusalMemory` has passed. When an
-/// exchange is refused, the token to exchange is replaced once; a second refusal is remembered in
-/// the same way, but only for its spec. Sources do not share what they know of refusals, not with
+/// more than ten seconds ago. Within these ten seconds two passwords are under way at most (other
+/// logins: as many as `RetryConfig::attemptsAtOnce`), so that a password that was changed at the
+/// service meanwhile is refused twice at most. The refusal is then answered from memory, with the
+/// same exception class and message, until the secret changes or `RetryConfig::refusalMemory` has
+/// passed.
+///
+/// A password that was sent without a success in the last ten seconds is not abandoned: when all
+/// callers have left, they receive their exceptions at once, but the attempt goes on to its own
+/// limit (`RetryConfig::attemptTimeout`) or to `Stop`, so that its verdict is known. Until then,
+/// other logins with the password wait. When it ends without a verdict, there is a pause before the
+/// next one that grows as the pauses between the refreshes of a key do.
+///
+/// When an exchange is refused, the token to exchange is replaced, if it has been known for 30
+/// seconds or is the first one, and the exchange is repeated once. The last refusal is remembered
+/// in the same way, but only for its spec, as is the refusal of a login for a spec with an act-as
+/// token, unless the fault's code is `FailedAuthentication`. At most `CacheConfig::capacity` such
+/// refusals are remembered. Sources do not share what they know of refusals, not with
 /// those of other processes either: each of several sources with one account, and each child that
 /// was forked before, sends a wrong login once.
 ///
@@ -178,7 +197,9 @@ class SSOCLIENT_ACCESS_EXPORT TokenSource {
   /// Called exactly once, on a worker thread of the platform's pool, where it may block. Only when
   /// no worker can be started is it called on another thread of the platform, or on one that
   /// cancels, stops or calls the source, but never in its own call of `GetTokenAsync`. It must not
-  /// throw: an exception that leaves it ends the process.
+  /// throw: an exception that leaves it ends the process. While it waits, for `GetToken` for
+  /// example, it occupies a worker that requests need: if as many callbacks as the pool has workers
+  /// wait for tokens, they wait until their deadlines. Use `GetTokenAsync` in callbacks.
   using TokenCallback =
       std::function<void(const std::shared_ptr<const SamlToken>&, const Tarnik::Exception*)>;
 
