@@ -76,7 +76,7 @@ TEST(CallFaultsTest, FailoverAndPause) {
     tested.scripts[0]->Set(tested.Fails(Unreachable()));
     // The second one fails in the first round.
     tested.scripts[1]->Set([&tested](const AttemptRequest&, Limit&) {
-      return tested.Attempts() < 4 ? Unavailable(seconds(1)) : Issued(tested.NewToken(hours(1)));
+      return tested.Attempts() < 4 ? Unavailable(seconds(0)) : Issued(tested.NewToken(hours(1)));
     });
     tested.Make();
   };
