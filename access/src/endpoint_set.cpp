@@ -92,6 +92,7 @@ EndpointSet::Change EndpointSet::OnFailure(Index index, const Reason& reason,
   const CircuitState before = member.circuit.State();
   member.lastReason = reason;
   member.circuit.OnFailure(now, retryAfter, draw);
+  AskLast(index);
   return ChangeSince(before, index, now);
 }
 
@@ -137,8 +138,9 @@ std::string EndpointSet::WhyLeftOut(Index index, Instant::Steady now) const {
     return "left out while another call probes it; it failed before: " +
            member.lastReason.ToString();
   }
-  return "left out for another " + std::to_string(Until(member.circuit.RetryAt(), now).count()) +
-         " ms; it failed before: " + member.lastReason.ToString();
+  const auto left = std::chrono::ceil<std::chrono::seconds>(member.circuit.RetryAt() - now);
+  return "left out for another " + std::to_string(std::max<std::int64_t>(left.count(), 0)) +
+         " s; it failed before: " + member.lastReason.ToString();
 }
 
 bool EndpointSet::SetClockOffset(Index index, milliseconds offset) noexcept {

@@ -57,6 +57,7 @@ class EndpointSet {
   Change Begin(Index index, Instant::Steady now) noexcept;
   /// The endpoint has answered, which closes the circuit, and is preferred now if it `isPreferred`.
   Change OnAnswer(Index index, bool isPreferred = true) noexcept;
+  /// Another endpoint is preferred then.
   Change OnFailure(Index index, const Reason& reason, std::chrono::milliseconds retryAfter,
                    Instant::Steady now, double draw) noexcept;
   /// The endpoint has failed in a way that may concern this operation only.

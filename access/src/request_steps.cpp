@@ -18,6 +18,7 @@ namespace {
 
 // What a token to exchange loses of its life before the answer.
 constexpr std::chrono::seconds kTimeOfExchange{5};
+constexpr std::chrono::milliseconds kShortestRefresh{1000};
 constexpr std::chrono::seconds kLongestBaseLife = std::chrono::hours(24 * 365 * 30);
 
 // The result of the function is constructed in the secret. Empty when the function throws.
@@ -56,6 +57,12 @@ Failure Reworded(const Failure& failure, const std::string& text) {
   }
   return failure.Is<CommunicationException>() ? Failure::Of(CommunicationException(text))
                                               : Failure::Of(SsoException(text));
+}
+
+// A refresh leaves half of what is left of the token's life to the next attempt.
+std::chrono::milliseconds RefreshLimit(const CacheEntry& entry, const Instant& now) {
+  const auto half = (entry.Life().usableUntil.steady - now.steady) / 2;
+  return std::max(std::chrono::duration_cast<std::chrono::milliseconds>(half), kShortestRefresh);
 }
 
 }  // namespace
@@ -305,13 +312,15 @@ bool Core::Admit(const RequestPtr& request, Step& step) {
   step.endpoint = *request->place;
   step.order = request->order;
   step.begun = now.steady;
-  step.limit = Tarnik::Http::CreateCallLimit(now.steady + config_->retry.attemptTimeout);
+  const EntryPtr entry = cache_.Peek(SpecView(*request->key));
   step.record.source = config_->name;
   step.record.endpoint = endpoints_.Url(step.endpoint);
   step.record.operation = step.operation;
-  const EntryPtr entry = cache_.Peek(SpecView(*request->key));
   step.record.isRefresh = request->isBackground && entry != nullptr &&
                           entry->Life().IsUsable(now, std::chrono::seconds(0));
+  const auto limit = config_->retry.attemptTimeout;
+  step.limit = Tarnik::Http::CreateCallLimit(
+      now.steady + (step.record.isRefresh ? std::min(limit, RefreshLimit(*entry, now)) : limit));
   // From here on nothing fails, and what has begun here is ended by `Conclude`.
   request->place.reset();
   section.Circuit(endpoints_.Begin(step.endpoint, now.steady));

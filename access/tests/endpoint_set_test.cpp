@@ -64,6 +64,13 @@ TEST_F(EndpointSetTest, LastGoodOneIsFirst) {
   EXPECT_EQ(Order(), (Urls{"https://c", "https://a", "https://b"}));
 }
 
+TEST_F(EndpointSetTest, FailedOneIsNotFirst) {
+  FailOnce(1);
+  EXPECT_EQ(Order(), (Urls{"https://a", "https://b", "https://c"}));
+  FailOnce(0);
+  EXPECT_EQ(Order(), (Urls{"https://b", "https://a", "https://c"}));
+}
+
 TEST_F(EndpointSetTest, AnswerThatIsNotPreferredChangesNoOrder) {
   set.OnAnswer(1);
   set.OnAnswer(2, false);
@@ -91,14 +98,14 @@ TEST_F(EndpointSetTest, OpenCircuitsAreLeftOut) {
   EXPECT_EQ(Order(), (Urls{"https://b", "https://c"}));
   EXPECT_FALSE(set.CanAdmit(0, now));
   EXPECT_EQ(set.WhyLeftOut(0, now),
-            "left out for another 1500 ms; it failed before: unreachable: refused");
+            "left out for another 2 s; it failed before: unreachable: refused");
 }
 
 TEST_F(EndpointSetTest, ProbeChangesTheCircuit) {
   FailOnce(0);
   FailOnce(0);
   now += milliseconds(1500);
-  EXPECT_EQ(set.TakePlace(EndpointSet::Asked(3), now), 0U);
+  EXPECT_EQ(set.TakePlace({false, true, true}, now), 0U);
   const auto begun = set.Begin(0, now);
   ASSERT_TRUE(begun);
   EXPECT_EQ(begun->state, CircuitState::kHalfOpen);

@@ -179,8 +179,8 @@ TEST_F(FailoverTest, CallWhileTheOnlyEndpointAsksToWaitFailsAtOnce) {
   const Reply reply = Get(spec);
   EXPECT_TRUE(reply.Is<CommunicationException>());
   EXPECT_EQ(reply.Message(),
-            "No endpoint has given a token. https://a.example.com/sts: left out for another 30250 "
-            "ms; it failed before: http-status: HTTP status 503.");
+            "No endpoint has given a token. https://a.example.com/sts: left out for another 31 s; "
+            "it failed before: http-status: HTTP status 503.");
   EXPECT_EQ(Attempts(), 1U);
 }
 
@@ -277,6 +277,22 @@ TEST_F(FailoverTest, EndpointThatIsSilentLongerThanAllDeadlinesIsAskedLast) {
   EXPECT_NE(Get(spec, Within(seconds(2))).token, nullptr);
   // Nobody knows whether it is dead.
   EXPECT_TRUE(listener->Circuits().empty());
+}
+
+// A silent endpoint must not delay each key in turn.
+TEST_F(FailoverTest, TimeOutOfOneKeyMovesTheOthersToTheNextEndpoint) {
+  config.keepFresh = {SpecFor("a"), SpecFor("b"), SpecFor("c")};
+  scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
+    runtime->Pass(
+        std::chrono::duration_cast<milliseconds>(limit.Deadline() - runtime->Now().steady));
+    return Failed<CommunicationException>(FailureKind::kTimedOut, "It is silent.");
+  });
+  Make();
+  runtime->Advance(config.retry.attemptTimeout + seconds(2));
+  for (const TokenSpec& kept : config.keepFresh) {
+    EXPECT_NE(source->TryGetToken(kept), nullptr);
+  }
+  EXPECT_EQ(scripts[0]->Count(), 1U);
 }
 
 TEST_F(FailoverTest, SuccessEndsThePausesOfOthers) {

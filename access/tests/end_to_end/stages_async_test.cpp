@@ -16,6 +16,9 @@ namespace {
 using namespace std::chrono_literals;
 using Clock = std::chrono::steady_clock;
 
+// A password whose verdict is not known yet is not abandoned with its callers.
+constexpr std::chrono::milliseconds kAttempt{1000};
+
 class StageAsyncTest : public testing::TestWithParam<Stage> {
  protected:
   /// How late the best of a few calls was. Another program may use the processors meanwhile.
@@ -35,6 +38,7 @@ TEST_P(StageAsyncTest, ACallEndsAtItsDeadline) {
     const auto listener = std::make_shared<AwaitingListener>();
     TokenSourceConfig config = situation.Config();
     config.listener = listener;
+    config.retry.attemptTimeout = kAttempt;
     const auto source = CreateTokenSource(config);
     situation.Prepare(*source);
     const TokenSpec spec = situation.Spec();
@@ -55,6 +59,7 @@ TEST_P(StageAsyncTest, ACallEndsWhenItIsCancelled) {
     const auto listener = std::make_shared<AwaitingListener>();
     TokenSourceConfig config = situation.Config();
     config.listener = listener;
+    config.retry.attemptTimeout = kAttempt;
     const auto source = CreateTokenSource(config);
     situation.Prepare(*source);
     const CancellationSource cancellation;

@@ -56,8 +56,9 @@ struct RetryConfig {
   /// for their turn without a thread, first come first served.
   int attemptsAtOnce = 64;
   /// The limit of one attempt, from the look-up of the host to the last byte of the answer (of the
-  /// last leg, for a negotiation). At most 240 seconds, the limit of the client.
-  std::chrono::milliseconds attemptTimeout{std::chrono::seconds{30}};
+  /// last leg, for a negotiation). At most 240 seconds, the limit of the client. A refresh takes at
+  /// most half of the time for which the token is still handed out, but at least a second.
+  std::chrono::milliseconds attemptTimeout{std::chrono::seconds{10}};
   /// The pause before round n is random between half of and all of `firstDelay` * 2^(n-2), limited
   /// to `longestDelay`; both are positive. The pauses between the refreshes of a key while they
   /// fail, and between the probes of an endpoint, grow in the same way; the background requests for
@@ -153,13 +154,14 @@ struct TokenSourceMetrics {
 /// refresh is not refreshed, and leaves the cache at its end. The lifetime that counts is the one
 /// that the service granted, by the service's clock.
 ///
-/// Requests go to the endpoint that answered last. When it fails in a way that no service has
-/// decided (`AllowsFailover`), the next one is asked; an endpoint that fails repeatedly is left out
-/// until a probe succeeds. When all are left out, a call fails at once, with the reason of each. A
-/// SOAP fault and a token that is not accepted are decisions: no other endpoint is asked. The first
-/// attempt to refresh a token begins at the first endpoint of the list that is not left out, unless
-/// a caller waits or the token would not outlast the attempt (`RetryConfig::attemptTimeout`): so a
-/// source returns to its first endpoint after a failure, and callers do not wait for that.
+/// Requests go to the endpoint that answered last and has not failed since. When it fails in a way
+/// that no service has decided (`AllowsFailover`), the next one is asked; an endpoint that fails
+/// repeatedly is left out until a probe succeeds. When all are left out, a call fails at once, with
+/// the reason of each. A SOAP fault and a token that is not accepted are decisions: no other
+/// endpoint is asked. The first attempt to refresh a token begins at the first endpoint of the list
+/// that is not left out, unless a caller waits or the token would not outlast the attempt
+/// (`RetryConfig::attemptTimeout`): so a source returns to its first endpoint after a failure, and
+/// callers do not wait for that.
 ///
 /// A refused login reaches one endpoint once, however many callers and specs there are: until a
 /// login has succeeded with a secret, only one is under way, and again when the last success was
