@@ -4,6 +4,7 @@
 // text is: "freed" counts blocks that were released with it until the source was, "memory" all
 // writable memory while the token is in the cache.
 #include <algorithm>
+#include <chrono>
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
@@ -93,6 +94,10 @@ int main(int argc, char** argv) {
   if (where == "memory") {
     const auto source = MakeSource(argv);
     LogIn(*source);
+    // The worker may have the password for a moment after the token.
+    if (!source->Stop(std::chrono::seconds(10))) {
+      return 255;
+    }
     return std::min(CountInMemory(argv[6]), kMostPlaces);
   }
   return 255;
