@@ -219,10 +219,10 @@ class SSOCLIENT_ACCESS_EXPORT TokenSource {
   ///  - `Tarnik::InvalidArgumentException` when the deadline of `context` is in the past, or when
   ///    the request that the spec describes cannot be sent; nothing is then sent;
   ///  - `CommunicationException` when the deadline passes, with what the call was waiting for;
-  ///  - when all endpoints have failed: the exception of the only endpoint unchanged, or, of
-  ///  several,
-  ///    one of the class of the last failure with the reason of each endpoint. It is mostly a
-  ///    `CommunicationException`; after an HTTP status 500 without a fault it is an `SsoException`;
+  ///  - when the endpoints have failed: the exception of the client, if there is one endpoint; of
+  ///    several, one exception with the reason of each, which is a `CommunicationException` if the
+  ///    last failure was one, and otherwise an `SsoException`, as after an HTTP status 500 without
+  ///    a fault;
   ///  - `SsoException` when the service grants less than `CallContext::minimumLife`, or issues a
   ///    token that has ended;
   ///  - `Tarnik::CancelledException` when the caller has cancelled;
