@@ -199,8 +199,8 @@ TEST_F(AccessExamplesTest, ExportMetricsOffersCountersAndDurations) {
   }
   // The end of the token, which was requested for an hour, in seconds since 1970.
   const std::string gauge = "\ntoken_earliest_expiration_seconds ";
-  ASSERT_THAT(text, HasSubstr(gauge));
-  const double end = std::stod(text.substr(text.find(gauge) + gauge.size()));
+  const std::size_t at = text.find(gauge);
+  const double end = at == std::string::npos ? 0 : std::stod(text.substr(at + gauge.size()));
   EXPECT_NEAR(end - static_cast<double>(std::time(nullptr)), 3600, 300);
 
   lines.close();

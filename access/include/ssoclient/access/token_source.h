@@ -83,7 +83,7 @@ struct RetryConfig {
   int failuresToOpen = 3;
   /// How long a refused login is answered from memory, unless the secret changes. Only passwords
   /// can change: logins by certificate and negotiations are refused for this time, also after
-  /// `kinit` or after the service has learnt a certificate. A new source has no memory.
+  /// `kinit` or after the service has learnt a certificate. A new source remembers none.
   std::chrono::seconds refusalMemory{std::chrono::minutes{5}};
 };
 
