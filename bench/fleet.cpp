@@ -194,6 +194,7 @@ std::shared_ptr<const TokenSourceConfig> MakeConfig(const FleetPlan& plan, const
   }
   config.login = SsoClient::Access::PasswordLogin{"orders", [] { return std::string("secret"); }};
   config.refresh = plan.refresh;
+  config.retry = plan.retry;
   return std::make_shared<const TokenSourceConfig>(std::move(config));
 }
 

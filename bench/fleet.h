@@ -36,6 +36,7 @@ struct FleetPlan {
   Outage outage = Outage::kSilent;
   ListOrder order = ListOrder::kShuffled;
   SsoClient::Access::RefreshConfig refresh;
+  SsoClient::Access::RetryConfig retry;
   std::chrono::seconds lifetime{3600};
   /// All servers start within this time.
   std::chrono::seconds start{60};

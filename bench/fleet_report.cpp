@@ -19,6 +19,7 @@ namespace {
 using std::chrono::hours;
 using std::chrono::milliseconds;
 using std::chrono::minutes;
+using std::chrono::seconds;
 
 using ByMinute = std::vector<std::uint32_t>;
 
@@ -154,7 +155,21 @@ std::vector<Variant> MakeVariants(std::size_t servers) {
   add("jitter 0.2", [](FleetPlan& plan) { plan.refresh.jitter = 0.2; });
   add("fraction 0.5", [](FleetPlan& plan) { plan.refresh.fraction = 0.5; });
   add("fraction 0.9", [](FleetPlan& plan) { plan.refresh.fraction = 0.9; });
-  add("tokens of 5 minutes", [](FleetPlan& plan) { plan.lifetime = minutes(5); });
+  // What the limits of attempts and the pauses do shows where the cache helps little.
+  base.lifetime = minutes(5);
+  add("tokens of 5 minutes", [](FleetPlan&) {});
+  add("- 1 failure opens", [](FleetPlan& plan) { plan.retry.failuresToOpen = 1; });
+  add("- 10 failures open", [](FleetPlan& plan) { plan.retry.failuresToOpen = 10; });
+  add("- first delay 10 s", [](FleetPlan& plan) { plan.retry.firstDelay = seconds(10); });
+  add("- longest delay 10 s", [](FleetPlan& plan) { plan.retry.longestDelay = seconds(10); });
+  add("- longest delay 5 m", [](FleetPlan& plan) { plan.retry.longestDelay = minutes(5); });
+  base.lifetime = hours(1);
+  base.betweenCalls = hours(2);
+  add("a call in 2 hours", [](FleetPlan&) {});
+  add("- attempts of 5 s", [](FleetPlan& plan) { plan.retry.attemptTimeout = seconds(5); });
+  add("- attempts of 9 s", [](FleetPlan& plan) { plan.retry.attemptTimeout = seconds(9); });
+  add("- attempts of 120 s", [](FleetPlan& plan) { plan.retry.attemptTimeout = minutes(2); });
+  add("- 1 failure opens", [](FleetPlan& plan) { plan.retry.failuresToOpen = 1; });
   return variants;
 }
 

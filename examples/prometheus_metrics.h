@@ -37,9 +37,22 @@ class SourceCounters final : public prometheus::Collectable {
       : source_(std::move(source)) {}
   std::vector<prometheus::MetricFamily> Collect() const override {
     const auto now = source_->Metrics();
-    return {Counter("token_hits_total", now.hits), Counter("token_misses_total", now.misses),
-            Counter("token_shared_total", now.shared), Counter("token_logins_total", now.logins),
-            Counter("token_refresh_failures_total", now.refreshFailures)};
+    std::vector<prometheus::MetricFamily> all{
+        Counter("token_hits_total", now.hits),
+        Counter("token_misses_total", now.misses),
+        Counter("token_shared_total", now.shared),
+        Counter("token_refused_from_memory_total", now.refusedFromMemory),
+        Counter("token_evictions_total", now.evictions),
+        Counter("token_logins_total", now.logins),
+        Counter("token_renewals_total", now.renewals),
+        Counter("token_exchanges_total", now.exchanges),
+        Counter("token_refresh_failures_total", now.refreshFailures),
+        Counter("token_deviations_total", now.deviations)};
+    if (now.earliestExpiration) {
+      all.push_back(Gauge("token_earliest_expiration_seconds",
+                          static_cast<double>(now.earliestExpiration->GetUtcTime()) / 1e6));
+    }
+    return all;
   }
 
  private:
@@ -47,6 +60,12 @@ class SourceCounters final : public prometheus::Collectable {
     prometheus::ClientMetric metric;
     metric.counter.value = static_cast<double>(value);
     return {name, "", prometheus::MetricType::Counter, {metric}};
+  }
+  /// A time is in seconds since 1970.
+  static prometheus::MetricFamily Gauge(const std::string& name, double value) {
+    prometheus::ClientMetric metric;
+    metric.gauge.value = value;
+    return {name, "", prometheus::MetricType::Gauge, {metric}};
   }
   const std::shared_ptr<SsoClient::Access::TokenSource> source_;
 };

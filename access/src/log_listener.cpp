@@ -1,3 +1,4 @@
+#include <chrono>
 #include <string>
 
 #include <ssoclient/access/listener.h>
@@ -54,6 +55,16 @@ int LevelOf(const AttemptRecord& attempt) noexcept {
   return IsRefused(attempt.failure) ? kRefusedLevel : kFailureLevel;
 }
 
+// Such as "is slow by 90 s", to the nearest second.
+std::string Compare(std::chrono::milliseconds offset) {
+  const auto seconds = std::chrono::round<std::chrono::seconds>(offset).count();
+  if (seconds == 0) {
+    return "agrees with this system's";
+  }
+  return seconds < 0 ? "is slow by " + std::to_string(-seconds) + " s"
+                     : "is fast by " + std::to_string(seconds) + " s";
+}
+
 class LogListener final : public AccessListener {
  public:
   void OnAttemptBegun(const AttemptRecord& attempt) override {
@@ -89,15 +100,17 @@ class LogListener final : public AccessListener {
   }
 
   void OnCircuit(const CircuitRecord& circuit) override {
-    LogInternal(
-        Logger(), kWarningLevel, "Source '%1': circuit of %2 is %3, next probe in %4 ms",
-        {circuit.source, circuit.endpoint, NameOf(circuit.state), circuit.retryAfter.count()});
+    const std::string probe =
+        circuit.state == CircuitState::kOpen
+            ? ", next probe in " + std::to_string(circuit.retryAfter.count()) + " ms"
+            : std::string();
+    LogInternal(Logger(), kWarningLevel, "Source '%1': circuit of %2 is %3%4",
+                {circuit.source, circuit.endpoint, NameOf(circuit.state), probe});
   }
 
   void OnClock(const ClockRecord& clock) override {
-    LogInternal(Logger(), kWarningLevel,
-                "Source '%1': the clock of %2 is %3 ms ahead of this system's",
-                {clock.source, clock.endpoint, clock.offset.count()});
+    LogInternal(Logger(), kWarningLevel, "Source '%1': the clock of %2 %3",
+                {clock.source, clock.endpoint, Compare(clock.offset)});
   }
 
   void OnDeviation(const DeviationRecord& deviation) override {

@@ -64,7 +64,7 @@ TEST_F(LogListenerTest, FailuresAreAtLevelThreeAndRefusalsAtLevelTwo) {
                           "2" + text + "expired-password: No.", "6" + text + "abandoned: No."}));
 }
 
-TEST_F(LogListenerTest, RefreshesCircuitsClocksAndDeviationsAreWritten) {
+TEST_F(LogListenerTest, RefreshesAndDeviationsAreWritten) {
   RefreshFailureRecord refresh;
   refresh.source = "orders";
   refresh.failure = FailureKind::kTimedOut;
@@ -73,18 +73,33 @@ TEST_F(LogListenerTest, RefreshesCircuitsClocksAndDeviationsAreWritten) {
   listener->OnRefreshFailed(refresh);
   refresh.usableUntil = Tarnik::System::DateTimeFromUtc(0, false);
   listener->OnRefreshFailed(refresh);
-  listener->OnCircuit({"orders", "https://sts", CircuitState::kOpen, std::chrono::seconds(2)});
-  listener->OnClock({"orders", "https://sts", std::chrono::seconds(90)});
   listener->OnDeviation({"orders", "https://sts", "subject", "alice", "bob"});
   const std::string failed = "3 Source 'orders': refresh has failed, next one in 1500 ms, ";
   EXPECT_EQ(
       lines,
       (Lines{failed + "there is no token: timed-out: Silent.",
              failed + "the token is usable until 1970-01-01T00:00:00.000Z: timed-out: Silent.",
-             "4 Source 'orders': circuit of https://sts is open, next probe in 2000 ms",
-             "4 Source 'orders': the clock of https://sts is 90000 ms ahead of this system's",
              "4 Source 'orders': https://sts has issued a token with another subject than asked: "
              "'bob' for 'alice'"}));
+}
+
+TEST_F(LogListenerTest, OnlyAnOpenCircuitHasATimeOfItsNextProbe) {
+  listener->OnCircuit({"orders", "https://sts", CircuitState::kOpen, std::chrono::seconds(2)});
+  listener->OnCircuit({"orders", "https://sts", CircuitState::kHalfOpen, {}});
+  listener->OnCircuit({"orders", "https://sts", CircuitState::kClosed, {}});
+  const std::string circuit = "4 Source 'orders': circuit of https://sts is ";
+  EXPECT_EQ(lines, (Lines{circuit + "open, next probe in 2000 ms", circuit + "half-open",
+                          circuit + "closed"}));
+}
+
+TEST_F(LogListenerTest, ClockIsFastOrSlowByWholeSeconds) {
+  for (const int offset : {90'000, -90'000, -89'600, 400, -400}) {
+    listener->OnClock({"orders", "https://sts", std::chrono::milliseconds(offset)});
+  }
+  const std::string clock = "4 Source 'orders': the clock of https://sts ";
+  EXPECT_EQ(lines,
+            (Lines{clock + "is fast by 90 s", clock + "is slow by 90 s", clock + "is slow by 90 s",
+                   clock + "agrees with this system's", clock + "agrees with this system's"}));
 }
 
 TEST_F(LogListenerTest, ListenerDoesNothingByDefault) {

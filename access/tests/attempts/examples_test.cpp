@@ -1,5 +1,6 @@
 // The examples of token sources.
 #include <cstddef>
+#include <ctime>
 #include <fstream>
 #include <string>
 #include <thread>
@@ -189,9 +190,18 @@ TEST_F(AccessExamplesTest, ExportMetricsOffersCountersAndDurations) {
     text = Get(url);
   }
   EXPECT_THAT(text, HasSubstr(attempts));
-  EXPECT_THAT(text, HasSubstr("\ntoken_hits_total 1"));
-  EXPECT_THAT(text, HasSubstr("\ntoken_misses_total 1"));
-  EXPECT_THAT(text, HasSubstr("\ntoken_logins_total 1"));
+  for (const char* counter : {"hits", "misses", "logins"}) {
+    EXPECT_THAT(text, HasSubstr("\ntoken_" + std::string(counter) + "_total 1\n"));
+  }
+  for (const char* counter : {"shared", "refused_from_memory", "evictions", "renewals", "exchanges",
+                              "refresh_failures", "deviations"}) {
+    EXPECT_THAT(text, HasSubstr("\ntoken_" + std::string(counter) + "_total 0\n"));
+  }
+  // The end of the token, which was requested for an hour, in seconds since 1970.
+  const std::string gauge = "\ntoken_earliest_expiration_seconds ";
+  const std::size_t at = text.find(gauge);
+  const double end = at == std::string::npos ? 0 : std::stod(text.substr(at + gauge.size()));
+  EXPECT_NEAR(end - static_cast<double>(std::time(nullptr)), 3600, 300);
 
   lines.close();
   program.join();

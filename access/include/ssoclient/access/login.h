@@ -29,10 +29,11 @@ struct PasswordLogin {
 };
 
 /// Logs in as the owner of the holder-of-key certificate, which the source must have. The specs
-/// must have `CONFIRMATION_DEFAULT`.
+/// must have `CONFIRMATION_DEFAULT`. A refusal is remembered for `RetryConfig::refusalMemory`.
 struct CertificateLogin {};
 
-/// Logs in by a negotiation such as Kerberos.
+/// Logs in by a negotiation such as Kerberos. A refusal is remembered for
+/// `RetryConfig::refusalMemory`, also when new tickets are there (see `RetryConfig`).
 struct NegotiatedLogin {
   /// Returns a new handler, never null. Called on a worker thread for each login at each endpoint;
   /// may block and throw as `PasswordLogin::password` may. All calls use the same copy of this

@@ -35,7 +35,8 @@ struct RefreshConfig {
   double fraction = 0.75;
   /// How far that moment is moved at random, once for each token: by at most this fraction of the
   /// lifetime, earlier or later. Between 0 and 1; what would leave the lifetime is cut off, and
-  /// what would be before a tenth of it is put off until then.
+  /// what would be before a tenth of it, or before `fraction` if that is less, is put off until
+  /// then.
   double jitter = 0.1;
   /// A token is handed out only while it has at least a twentieth of its lifetime left, limited to
   /// this. Not negative.
@@ -44,9 +45,12 @@ struct RefreshConfig {
 
 /// How attempts are limited and repeated. A refused login is never repeated.
 struct RetryConfig {
-  /// The attempts of one request, at all endpoints together; at least 1. Each endpoint is asked
-  /// once without delay; then there is a pause before each further round. When a renewal is
-  /// followed by a login, the attempts to renew do not count.
+  /// How many attempts of one request may end without a decision of a service (`AllowsFailover`),
+  /// at all endpoints together; at least 1. Each endpoint is asked once without delay; then there
+  /// is a pause before each further round. A background refresh that no caller waits for asks each
+  /// endpoint once at most. What a service has decided is extra: a refused renewal that a login
+  /// follows, and a refused exchange that is repeated with another token (see `TokenSource`). After
+  /// a renewal that no endpoint has answered, the login has the full number again.
   int attempts = 4;
   /// The attempts of the source that are under way at once; at least 1. Each endpoint has an equal
   /// share of them, and at least one, so that an endpoint that does not answer leaves room for the
@@ -78,7 +82,9 @@ struct RetryConfig {
   /// when the deadlines of all callers have passed in one, the next request begins at another
   /// endpoint.
   int failuresToOpen = 3;
-  /// How long a refused login is answered from memory, unless the secret changes.
+  /// How long a refused login is answered from memory, unless the secret changes. Only passwords
+  /// can change: logins by certificate and negotiations are refused for this time, also after
+  /// `kinit` or after the service has learnt a certificate. A new source remembers none.
   std::chrono::seconds refusalMemory{std::chrono::minutes{5}};
 };
 
@@ -120,7 +126,8 @@ struct TokenSourceMetrics {
   std::uint64_t hits = 0;               ///< answered from the cache
   std::uint64_t misses = 0;             ///< began a request
   std::uint64_t shared = 0;             ///< waited for the request of another caller
-  std::uint64_t refusedFromMemory = 0;  ///< answered with a refusal from memory
+  std::uint64_t refusedFromMemory = 0;  ///< answered with a refusal from memory: each caller, and
+                                        ///< each refresh that no caller waited for
   std::uint64_t evictions = 0;          ///< for lack of space
   std::uint64_t logins = 0;             ///< successful
   std::uint64_t renewals = 0;           ///< successful
@@ -213,8 +220,11 @@ class SSOCLIENT_ACCESS_EXPORT TokenSource {
   /// Throws, besides what the operations of `SecurityTokenService` throw,
   ///  - `Tarnik::InvalidArgumentException` when the deadline of `context` is in the past, or when
   ///    the request that the spec describes cannot be sent; nothing is then sent;
-  ///  - `CommunicationException` when the deadline passes, with what the call was waiting for, and
-  ///    when the endpoints have failed, with the reason of each;
+  ///  - `CommunicationException` when the deadline passes, with what the call was waiting for;
+  ///  - when the endpoints have failed: the exception of the client, if there is one endpoint; of
+  ///    several, one exception with the reason of each, which is a `CommunicationException` if the
+  ///    last failure was one, and otherwise an `SsoException`, as after an HTTP status 500 without
+  ///    a fault;
   ///  - `SsoException` when the service grants less than `CallContext::minimumLife`, or issues a
   ///    token that has ended;
   ///  - `Tarnik::CancelledException` when the caller has cancelled;
@@ -253,7 +263,8 @@ class SSOCLIENT_ACCESS_EXPORT TokenSource {
 /// URLs beside http URLs, since a login must not reach the network in plain text when TLS fails,
 /// for an https URL without an SSL context, when the token factory is null, for a login whose
 /// functions are not set or that lacks the holder-of-key configuration that it needs, for an
-/// unusable holder-of-key configuration (see `CreateSecurityTokenService`), and for a number that
+/// unusable holder-of-key configuration (see `CreateSecurityTokenService`), for a spec in
+/// `keepFresh` that cannot be sent, for more of them than `cache.capacity`, and for a number that
 /// is outside its range.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TokenSource> CreateTokenSource(TokenSourceConfig config);
 
