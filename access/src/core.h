@@ -122,7 +122,10 @@ class Core : public std::enable_shared_from_this<Core> {
   void ReceiveBase(const RequestPtr& request, const Answer& answer) noexcept;
   void NoteBase(Section& section, const std::shared_ptr<const SamlToken>& token) noexcept;
   bool RunLogin(const RequestPtr& request, Step& step);
+  void FailLogin(const RequestPtr& request, Step& step, const Failure& failure);
   bool RunAttempt(const RequestPtr& request, Step& step, const std::string& secret);
+  void ReportBegin(const AttemptRecord& record) const noexcept;
+  bool HasUsableToken(const Request& request, const Instant& now);
   bool Admit(const RequestPtr& request, Step& step);
   bool MayLogIn(Section& section, const RequestPtr& request, const Step& step, const Instant& now);
   Failure RememberedRefusal(const Request& request, const Step& step, const Instant& now) const;
@@ -181,7 +184,7 @@ class Core : public std::enable_shared_from_this<Core> {
   EntryPtr KeepLonger(Section& section, const EntryPtr& entry, const Instant& now);
   void ScheduleAfterFailure(Section& section, const Request& request, const Failure& failure,
                             const Instant& now) noexcept;
-  void EndOutage(Section& section, const Instant& now) noexcept;
+  void EndOutage(Section& section, const Instant& now, bool isOver) noexcept;
   void ArmTimer(Section& section, Instant::Steady earliest = Instant::Steady::min()) noexcept;
   bool IsPinned(const KeyPtr& key) noexcept;
 
@@ -213,6 +216,8 @@ class Core : public std::enable_shared_from_this<Core> {
   std::unordered_map<KeyPtr, RequestPtr, KeyHash, KeyEqual> requests_;
   std::size_t waiting_ = 0;
   RefreshSchedule schedule_;
+  /// From when on an answer ends pauses and postponements; the least of all that wait.
+  Instant::Steady nextWake_ = Instant::Steady::max();
   std::size_t backgroundRequests_ = 0;
   Tarnik::Ref<Tarnik::System::CancellableItem> timer_;
   Instant::Steady timerAt_ = Instant::Steady::max();

@@ -113,15 +113,17 @@ EndpointSet::Change EndpointSet::OnAbandoned(Index index) noexcept {
   return ChangeSince(before, index, {});
 }
 
-boost::optional<Instant::Steady> EndpointSet::ClosedAdmission() const noexcept {
-  boost::optional<Instant::Steady> earliest;
+boost::optional<Instant::Steady> EndpointSet::NextAdmission() const noexcept {
+  Instant::Steady earliest = Instant::Steady::max();
+  bool isAnyClosed = false;
   for (const Member& member : members_) {
-    if (member.circuit.State() == CircuitState::kClosed) {
-      earliest =
-          earliest ? std::min(*earliest, member.circuit.RetryAt()) : member.circuit.RetryAt();
+    const CircuitState state = member.circuit.State();
+    isAnyClosed |= state == CircuitState::kClosed;
+    if (state != CircuitState::kHalfOpen) {
+      earliest = std::min(earliest, member.circuit.RetryAt());
     }
   }
-  return earliest;
+  return boost::make_optional(isAnyClosed, earliest);
 }
 
 Instant::Steady EndpointSet::EarliestAdmission() const noexcept {

@@ -70,8 +70,8 @@ class EndpointSet {
     preferred_ = preferred_ == index ? (index + 1) % Size() : preferred_;
   }
 
-  /// When an endpoint with a closed circuit may be asked; not set when all circuits are open.
-  boost::optional<Instant::Steady> ClosedAdmission() const noexcept;
+  /// When an endpoint that nobody probes may be asked; not set when no circuit is closed.
+  boost::optional<Instant::Steady> NextAdmission() const noexcept;
   /// When any endpoint may be asked.
   Instant::Steady EarliestAdmission() const noexcept;
   /// Why an endpoint is left out, with its last failure.

@@ -24,6 +24,8 @@ class RefreshSchedule {
     Instant::Steady at = Instant::Steady::max();
     /// When the next background request may begin.
     Instant::Steady notBefore = Instant::Steady::min();
+    /// From then on the answer of an endpoint moves the key forward.
+    Instant::Steady nextWake = Instant::Steady::min();
   };
 
   /// Adds the key if it is not there, and moves it to `at`. The reference is valid until the key is
@@ -37,14 +39,11 @@ class RefreshSchedule {
   boost::optional<Instant::Steady> Earliest() const;
   /// The keys whose time has come, at most `limit`, the earliest first.
   std::vector<KeyPtr> Due(Instant::Steady now, std::size_t limit) const;
-  /// Visits the keys with failures in an outage, which is over: their failures count no longer.
-  /// `visit` may move its key.
+  /// Visits the keys whose last refresh has failed in an outage. `visit` may move its key.
   template <class Visit>
-  void EndOutage(const Visit& visit) {
+  void ForEachInOutage(const Visit& visit) {
     for (auto& [key, item] : items_) {
-      if (item.failures > 0 && item.isOutage) {
-        item.failures = 0;
-        item.isOutage = false;
+      if (item.isOutage) {
         visit(key, item);
       }
     }

@@ -19,6 +19,8 @@ constexpr std::size_t kKeysAtOnce = 64;
 // Between looks at a key, and between the background requests of one.
 constexpr std::chrono::seconds kNextLook{1};
 constexpr std::chrono::minutes kLookAfterEnd{10};
+// As often as in an outage at most, when a service answers some requests and not others.
+constexpr std::chrono::seconds kBetweenWakes{30};
 
 // When the act-as token of a spec ends, nothing may be requested with it any more.
 bool HasActAsEnded(const TokenSpec& spec, const Instant& now) {
@@ -167,6 +169,7 @@ void Core::ScheduleAfterFailure(Section& section, const Request& request, const 
       now.steady + Backoff(config_->retry, item->failures, milliseconds(0), runtime_->Draw());
   if (item->isOutage) {
     next = std::max(next, endpoints_.EarliestAdmission());
+    nextWake_ = std::min(nextWake_, item->nextWake);
   }
   const EntryPtr entry = cache_.Peek(SpecView(*request.key));
   if (entry != nullptr) {
@@ -189,15 +192,34 @@ void Core::ScheduleAfterFailure(Section& section, const Request& request, const 
   });
 }
 
-// An endpoint answers again. What waits for that goes on, spread a little.
-void Core::EndOutage(Section& section, const Instant& now) noexcept {
+// An endpoint has answered. What waits for that goes on, spread a little. An outage that has opened
+// circuits `isOver` when one closes. Without that, others may still be failing, so that nothing is
+// woken again soon.
+void Core::EndOutage(Section& section, const Instant& now, bool isOver) noexcept {
+  if (!isOver && now.steady < nextWake_) {
+    return;
+  }
+  nextWake_ = Instant::Steady::max();
+  const auto isWoken = [&](Instant::Steady& nextWake) {
+    if (!isOver && now.steady < nextWake) {
+      nextWake_ = std::min(nextWake_, nextWake);
+      return false;
+    }
+    nextWake = now.steady + kBetweenWakes;
+    return true;
+  };
   for (const auto& [key, request] : requests_) {
-    if (request->pause != nullptr) {
+    if (request->pause != nullptr && isWoken(request->nextWake)) {
       section.Cancel(std::exchange(request->pause, nullptr));
       section.Start(request);
     }
   }
-  schedule_.EndOutage([&](const KeyPtr& key, const RefreshSchedule::Item& item) {
+  schedule_.ForEachInOutage([&](const KeyPtr& key, RefreshSchedule::Item& item) {
+    if (!isWoken(item.nextWake)) {
+      return;
+    }
+    item.isOutage = false;
+    item.failures = isOver ? 0 : item.failures;
     const auto spread = std::chrono::duration_cast<milliseconds>(
         runtime_->Draw() * std::chrono::duration<double, std::milli>(config_->retry.firstDelay));
     schedule_.Set(key, std::min(item.at, now.steady + spread));

@@ -76,6 +76,8 @@ struct Request {
   Tarnik::Ref<Tarnik::Http::CallLimit> limit;
   /// The pause before the next round; null otherwise.
   Tarnik::Ref<Tarnik::System::CancellableItem> pause;
+  /// From then on the answer of an endpoint ends the pause.
+  Instant::Steady nextWake = Instant::Steady::min();
   /// The next one in the list of a section that is about to run this one.
   std::shared_ptr<Request> nextStarted;
   /// The same for one that has ended, and what is then cancelled.

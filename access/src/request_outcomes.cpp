@@ -124,9 +124,7 @@ void Core::NoteCircuit(Section& section, const Step& step, const Result& result,
         outcome.token != nullptr || step.order == EndpointSet::Order::kPreferredFirst;
     const EndpointSet::Change change = endpoints_.OnAnswer(step.endpoint, isPreferred);
     section.Circuit(change);
-    if (change) {
-      EndOutage(section, now);
-    }
+    EndOutage(section, now, change.has_value());
   } else if (step.operation == AttemptOperation::kRenewal &&
              outcome.kind == FailureKind::kHttpStatus) {
     section.Circuit(endpoints_.OnUnclear(step.endpoint, result.reason, outcome.retryAfter,
@@ -294,8 +292,10 @@ int Core::AttemptLimit(const Request& request) const noexcept {
 void Core::EndRound(Section& section, const RequestPtr& request, const Instant& now) noexcept {
   const bool hasAsked =
       std::find(request->asked.begin(), request->asked.end(), true) != request->asked.end();
-  const auto admission = endpoints_.ClosedAdmission();
-  if (!hasAsked || !admission || request->undecided >= AttemptLimit(*request)) {
+  // After a pause, another request may be probing what this one has waited for.
+  const bool mayWait = hasAsked || request->rounds > 1;
+  const auto admission = endpoints_.NextAdmission();
+  if (!mayWait || !admission || request->undecided >= AttemptLimit(*request)) {
     FailUndecided(section, request, now);
     return;
   }
@@ -325,6 +325,7 @@ bool Core::Pause(Section& section, const RequestPtr& request, Instant::Steady un
     return false;
   }
   request->stage = Stage::kPause;
+  nextWake_ = std::min(nextWake_, request->nextWake);
   return true;
 }
 

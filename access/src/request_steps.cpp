@@ -5,6 +5,7 @@
 #include <variant>
 
 #include <ssoclient/exceptions.h>
+#include <tarnik/text/string_util.h>
 
 #include "core.h"
 #include "secret_text.h"
@@ -220,6 +221,7 @@ void Core::NoteBase(Section& section, const std::shared_ptr<const SamlToken>& to
 
 bool Core::RunLogin(const RequestPtr& request, Step& step) {
   Failure failure;
+  step.begun = runtime_->Now().steady;
   const Secret secret = FetchSecret(std::get<PasswordLogin>(config_->login), failure);
   {
     Section section(*this);
@@ -232,26 +234,55 @@ bool Core::RunLogin(const RequestPtr& request, Step& step) {
     });
   }
   if (failure.IsSet()) {
-    FailHere(request, failure.WithKind(FailureKind::kSecretFailed));
+    FailLogin(request, step, failure.WithKind(FailureKind::kSecretFailed));
     return false;
   }
   step.tag = tagger_.TagOf(secret.text);
   return RunAttempt(request, step, secret.text);
 }
 
+// An attempt that has ended before an endpoint was chosen.
+void Core::FailLogin(const RequestPtr& request, Step& step, const Failure& failure) {
+  AttemptRecord& record = step.record;
+  const Instant now = runtime_->Now();
+  std::string message = failure.RecordText();
+  {
+    const Section section(*this);
+    record.source = config_->name;
+    record.operation = step.operation;
+    record.isRefresh = request->isBackground && HasUsableToken(*request, now);
+    record.id = ++lastAttemptId_;
+    record.number = ++request->attempts;
+  }
+  ReportBegin(record);
+  Section section(*this);
+  counters_.CountAttempt(failure.Kind());
+  record.duration = std::chrono::duration_cast<std::chrono::microseconds>(now.steady - step.begun);
+  record.failure = failure.Kind();
+  record.message = std::move(message);
+  section.ReportEnd(record);
+  if (!request->hasEnded) {
+    Fail(section, request, failure, now);
+  }
+}
+
 bool Core::RunAttempt(const RequestPtr& request, Step& step, const std::string& secret) {
   if (!Admit(request, step)) {
     return false;
   }
-  if (config_->listener != nullptr) {
-    Section::Notify(*config_->listener,
-                    [&step](AccessListener& listener) { listener.OnAttemptBegun(step.record); });
-  }
+  ReportBegin(step.record);
   const bool goesOn = Conclude(request, step, Perform(step, *request, secret));
   if (step.isBaseRefused) {
     InvalidateBase(step);
   }
   return goesOn;
+}
+
+void Core::ReportBegin(const AttemptRecord& record) const noexcept {
+  if (config_->listener != nullptr) {
+    Section::Notify(*config_->listener,
+                    [&record](AccessListener& listener) { listener.OnAttemptBegun(record); });
+  }
 }
 
 Result Core::Perform(const Step& step, const Request& request, const std::string& secret) noexcept {
@@ -285,9 +316,11 @@ Failure Core::ToRemember(const Failure& failure, const std::string& secret) cons
     return {};
   }
   try {
-    const std::string text = failure.Message();
+    std::string text = failure.Message();
     const std::string shown = HideSecret(text, secret);
-    return shown == text ? failure : Reworded(failure, shown).WithKind(kind);
+    const bool isSame = shown == text;
+    Tarnik::StringUtil::Cleanse(text);
+    return isSame ? failure : Reworded(failure, shown).WithKind(kind);
   } catch (const std::bad_alloc&) {
     return kind == FailureKind::kRefusedLogin ? refused_ : expired_;
   }
@@ -299,6 +332,11 @@ void Core::InvalidateBase(const Step& step) noexcept {
     std::get<TokenLogin>(config_->login).source->Invalidate(*step.base);
   } catch (...) {
   }
+}
+
+bool Core::HasUsableToken(const Request& request, const Instant& now) {
+  const EntryPtr entry = cache_.Peek(SpecView(*request.key));
+  return entry != nullptr && entry->Life().IsUsable(now, std::chrono::seconds(0));
 }
 
 // False when the request has ended or has to wait.
@@ -316,8 +354,7 @@ bool Core::Admit(const RequestPtr& request, Step& step) {
   step.record.source = config_->name;
   step.record.endpoint = endpoints_.Url(step.endpoint);
   step.record.operation = step.operation;
-  step.record.isRefresh = request->isBackground && entry != nullptr &&
-                          entry->Life().IsUsable(now, std::chrono::seconds(0));
+  step.record.isRefresh = request->isBackground && HasUsableToken(*request, now);
   const auto limit = config_->retry.attemptTimeout;
   step.limit = Tarnik::Http::CreateCallLimit(
       now.steady + (step.record.isRefresh ? std::min(limit, RefreshLimit(*entry, now)) : limit));

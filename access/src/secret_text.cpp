@@ -27,12 +27,18 @@ constexpr std::size_t kMaxRecordText = 1000;
 /// A part of a text: from the first index to before the second.
 using Range = std::pair<std::size_t, std::size_t>;
 
-/// A text that was derived from another one, and where each of its bytes comes from.
+/// A text that was derived from another one, and where each of its bytes comes from. It may contain
+/// the secret, so its text never grows, which would release a copy, and is overwritten in the end.
 struct Derived {
   std::string text;
   std::vector<Range> origins;
 
   Derived() = default;
+  /// For a text of at most `size` bytes.
+  explicit Derived(std::size_t size) {
+    text.reserve(size);
+    origins.reserve(size);
+  }
   Derived(Derived&&) = default;
   Derived& operator=(Derived&&) = delete;
   ~Derived() { Tarnik::StringUtil::Cleanse(text); }
@@ -89,10 +95,10 @@ std::optional<std::string> Resolve(std::string_view name) {
   return character;
 }
 
-// Without one level of escapes.
+// Without one level of escapes. A character is not longer than a reference to it.
 Derived Unescape(const Derived& from) {
   constexpr std::size_t kMaxName = 12;
-  Derived result;
+  Derived result(from.text.size());
   for (std::size_t at = 0; at < from.text.size(); ++at) {
     const std::size_t end = from.text[at] == '&' ? from.text.find(';', at) : std::string::npos;
     const auto character = end == std::string::npos || end - at > kMaxName
@@ -110,9 +116,9 @@ Derived Unescape(const Derived& from) {
   return result;
 }
 
-// Without escapes, and with one character for all that may stand in for a blank.
+// Without escapes, and with one character for blanks and all that may replace them.
 Derived Normalise(std::string_view text) {
-  Derived result;
+  Derived result(text.size());
   for (std::size_t at = 0; at < text.size(); ++at) {
     result.Add(text[at], {at, at + 1});
   }
@@ -206,6 +212,8 @@ std::string HideSecret(std::string text, std::string_view secret) {
   }
   const std::size_t limit = kSearched + kLongestEscape * secret.size();
   if (text.size() > limit) {
+    // What is cut off stays in the buffer otherwise.
+    std::fill(text.begin() + static_cast<std::ptrdiff_t>(limit), text.end(), '\0');
     text.resize(limit);
   }
   const std::vector<Range> found = Occurrences(text, secret);

@@ -130,18 +130,22 @@ TEST_F(EndpointSetTest, AbandonedAfterTheDeadlinesOfAllPrefersTheNext) {
 }
 
 TEST_F(EndpointSetTest, AdmissionsAreTheEarliest) {
-  ASSERT_TRUE(set.ClosedAdmission());
-  EXPECT_LE(*set.ClosedAdmission(), now);
+  ASSERT_TRUE(set.NextAdmission());
+  EXPECT_LE(*set.NextAdmission(), now);
   FailOnce(0, seconds(10));
   FailOnce(1, seconds(20));
   FailOnce(2, seconds(30));
-  EXPECT_EQ(*set.ClosedAdmission(), now + milliseconds(10750));
+  EXPECT_EQ(*set.NextAdmission(), now + milliseconds(10750));
   FailOnce(0);
-  EXPECT_EQ(*set.ClosedAdmission(), now + milliseconds(20750));
+  EXPECT_EQ(*set.NextAdmission(), now + milliseconds(1500));
   EXPECT_EQ(set.EarliestAdmission(), now + milliseconds(1500));
+  // While it is probed, the next one counts.
+  set.Begin(0, now + milliseconds(1500));
+  EXPECT_EQ(*set.NextAdmission(), now + milliseconds(20750));
+  set.OnAbandoned(0);
   FailOnce(1);
   FailOnce(2);
-  EXPECT_FALSE(set.ClosedAdmission());
+  EXPECT_FALSE(set.NextAdmission());
   EXPECT_FALSE(set.CanAdmit(EndpointSet::Asked(3), now));
   EXPECT_FALSE(set.TakePlace(EndpointSet::Asked(3), now));
 }

@@ -170,9 +170,10 @@ TEST_F(RefreshTest, WhileAllEndpointsAreDownTheTokenIsServedAndAttemptsAreSpaced
     }
   }
   EXPECT_GT(Attempts(), before);
-  // The probes of two circuits, on average one in 30 seconds each, whatever the number of keys.
+  // The probes of two circuits, each after a pause of at most a minute and at least half of one,
+  // whatever the number of keys.
   for (const std::size_t attempts : perHour) {
-    EXPECT_LE(attempts, 2 * 150U);
+    EXPECT_LE(attempts, 2 * 120U);
     EXPECT_GE(attempts, 2 * 60U);
   }
   EXPECT_GT(listener->Refreshes().size(), 0U);
@@ -180,11 +181,6 @@ TEST_F(RefreshTest, WhileAllEndpointsAreDownTheTokenIsServedAndAttemptsAreSpaced
   EXPECT_EQ(record.source, "orders");
   EXPECT_EQ(record.failure, FailureKind::kUnreachable);
   EXPECT_TRUE(record.usableUntil.has_value());
-  // The first success ends it at once, for all keys.
-  ForAll(Issues(hours(24)));
-  runtime->Advance(minutes(2));
-  const auto logins = source->Metrics().logins;
-  EXPECT_EQ(logins, 2U * kKeys);
 }
 
 TEST_F(RefreshTest, RetryAfterSpacesTheAttemptsOfARefresh) {

@@ -283,6 +283,7 @@ TEST_F(FailoverTest, EndpointThatIsSilentLongerThanAllDeadlinesIsAskedLast) {
 TEST_F(FailoverTest, TimeOutOfOneKeyMovesTheOthersToTheNextEndpoint) {
   config.keepFresh = {SpecFor("a"), SpecFor("b"), SpecFor("c")};
   scripts[0]->Set([&](const AttemptRequest&, Limit& limit) {
+    runtime->Settle();
     runtime->Pass(
         std::chrono::duration_cast<milliseconds>(limit.Deadline() - runtime->Now().steady));
     return Failed<CommunicationException>(FailureKind::kTimedOut, "It is silent.");

@@ -97,6 +97,34 @@ TEST_F(ThrowingLoginTest, AnythingThatThePasswordFunctionThrowsReachesTheCallers
   EXPECT_NE(Get(spec).token, nullptr);
 }
 
+TEST_F(ThrowingLoginTest, FailureOfThePasswordFunctionIsCountedAndReported) {
+  bool isEmpty = false;
+  config.login = PasswordLogin{"alice", [&]() -> std::string {
+                                 runtime->Pass(milliseconds(20));
+                                 return isEmpty ? "" : throw Tarnik::IOException("no vault");
+                               }};
+  config.keepFresh = {spec};
+  Make();
+  runtime->Settle();
+  isEmpty = true;
+  Get(SpecFor("other"));
+  constexpr auto kIndex = static_cast<std::size_t>(FailureKind::kSecretFailed);
+  EXPECT_EQ(source->Metrics().attempts[kIndex], 2U);
+  const auto ended = listener->Ended();
+  ASSERT_EQ(ended.size(), 2U);
+  ASSERT_EQ(listener->Begun().size(), 2U);
+  EXPECT_EQ(listener->Begun()[0].id, ended[0].id);
+  EXPECT_EQ(ended[0].source, "orders");
+  EXPECT_EQ(ended[0].endpoint, "");
+  EXPECT_EQ(ended[0].operation, AttemptOperation::kLogin);
+  EXPECT_EQ(ended[0].number, 1);
+  EXPECT_EQ(ended[0].duration, milliseconds(20));
+  EXPECT_EQ(ended[0].failure, FailureKind::kSecretFailed);
+  EXPECT_EQ(ended[0].message, "no vault");
+  EXPECT_EQ(ended[1].message, "The login's function has returned an empty password.");
+  EXPECT_NE(ended[0].id, ended[1].id);
+}
+
 TEST_F(ThrowingLoginTest, BlockedCallerReceivesTheObject) {
   config.login = PasswordLogin{"alice", []() -> std::string { throw 42; }};
   const auto shared = std::make_shared<const TokenSourceConfig>(config);

@@ -25,7 +25,8 @@ void Release(void* memory) noexcept {
 
 }  // namespace
 
-FreedMemory::FreedMemory(std::string text) : text_(std::move(text)) {
+FreedMemory::FreedMemory(std::string text, std::size_t piece)
+    : text_(std::move(text)), piece_(piece) {
   current = this;
 }
 
@@ -35,8 +36,11 @@ FreedMemory::~FreedMemory() {
 
 void FreedMemory::Search(const void* memory) noexcept {
   const std::size_t size = ::malloc_usable_size(const_cast<void*>(memory));
-  if (::memmem(memory, size, text_.data(), text_.size()) != nullptr) {
-    ++finds_;
+  for (std::size_t at = 0; at + piece_ <= text_.size(); ++at) {
+    if (::memmem(memory, size, text_.data() + at, piece_) != nullptr) {
+      ++finds_;
+      return;
+    }
   }
 }
 

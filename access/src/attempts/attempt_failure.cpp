@@ -1,6 +1,5 @@
 #include "attempts/attempt_failure.h"
 
-#include <algorithm>
 #include <string_view>
 
 #include <ssoclient/exceptions.h>
@@ -87,15 +86,6 @@ FailureKind KindOf(const Tarnik::Exception& failure, const AttemptEvidence& evid
   return isAnswer && seen.httpStatus != 0 ? KindOfAnswer(failure, seen) : FailureKind::kLocal;
 }
 
-// Whether the fault's code says that the request's timestamp was refused (Web Services Security:
-// SOAP Message Security 1.1, section 10; a code of the family is also sent for other faults).
-bool IsRefusedTimestamp(std::string_view message) noexcept {
-  message.remove_prefix(std::min(kUnexpectedFault.size(), message.size()));
-  const std::string_view code = message.substr(0, message.find(';'));
-  const std::string_view name = code.substr(code.find(':') + 1);
-  return name == "MessageExpired" || name == "InvalidSecurity";
-}
-
 std::string DescribeClocks(const ClockReading& clock) {
   return " The service's clock reads " + FormatWallTime(clock.service) + ", this system's " +
          FormatWallTime(clock.system) + ".";
@@ -104,10 +94,11 @@ std::string DescribeClocks(const ClockReading& clock) {
 // `exception` as its caller receives it.
 std::exception_ptr Explain(const std::exception_ptr& exception, const Tarnik::Exception& failure,
                            FailureKind kind, const Observation& seen) {
-  if (kind == FailureKind::kFault && seen.clock && IsRefusedTimestamp(failure.Message()) &&
-      failure.Message().starts_with(kUnexpectedFault)) {
-    return std::make_exception_ptr(
-        SsoException(failure.Message() + DescribeClocks(*seen.clock), failure.Where()));
+  if (kind == FailureKind::kFault && seen.clock && seen.fault == SeenFault::kRefusedTimestamp) {
+    const std::string text = failure.Message() + DescribeClocks(*seen.clock);
+    return As<CommunicationException>(failure) == nullptr
+               ? std::make_exception_ptr(SsoException(text, failure.Where()))
+               : std::make_exception_ptr(CommunicationException(text, failure.Where()));
   }
   if (kind == FailureKind::kTimedOut) {
     // Without the words about a deadline of the caller, since it is that of the attempt.

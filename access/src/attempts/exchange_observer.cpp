@@ -6,6 +6,7 @@
 
 #include <tarnik/core/checked_cast.h>
 #include <tarnik/core/object_impl.h>
+#include <tarnik/text/string_util.h>
 #include <tarnik/xml/character_nodes.h>
 #include <tarnik/xml/document.h>
 #include <tarnik/xml/element_node.h>
@@ -49,7 +50,11 @@ SeenFault Examine(const ElementNode& envelope) {
   if (code == "FailedAuthentication") {
     return SeenFault::kFailedAuthentication;
   }
-  return code == "InvalidSecurityToken" ? SeenFault::kInvalidSecurityToken : SeenFault::kOther;
+  if (code == "InvalidSecurityToken") {
+    return SeenFault::kInvalidSecurityToken;
+  }
+  return code == "MessageExpired" || code == "InvalidSecurity" ? SeenFault::kRefusedTimestamp
+                                                               : SeenFault::kOther;
 }
 
 SeenFault Examine(Tarnik::Reader* body) {
@@ -62,12 +67,22 @@ SeenFault Examine(Tarnik::Reader* body) {
   }
 }
 
+// An answer may repeat the password, and contains a token. No copy of a part remains.
 std::string ReadAll(Tarnik::Reader& body) {
+  constexpr std::size_t kAtOnce = 4096;
   std::string text;
-  char buffer[4096];
-  while (const std::size_t size = body.Read(buffer, sizeof buffer)) {
-    text.append(buffer, size);
+  std::string buffer(kAtOnce, '\0');
+  while (const std::size_t size = body.Read(buffer.data(), buffer.size())) {
+    if (text.size() + size > text.capacity()) {
+      std::string larger;
+      larger.reserve(2 * (text.size() + size));
+      larger.append(text);
+      text.swap(larger);
+      Tarnik::StringUtil::Cleanse(larger);
+    }
+    text.append(buffer, 0, size);
   }
+  Tarnik::StringUtil::Cleanse(buffer);
   return text;
 }
 

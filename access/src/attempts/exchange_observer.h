@@ -23,7 +23,15 @@ struct ClockReading {
 
 /// The SOAP fault in an answer, also in one whose body the client does not read because of its HTTP
 /// status. The namespace of the code does not matter, since services confuse them.
-enum class SeenFault { kNone, kFailedAuthentication, kInvalidSecurityToken, kOther };
+enum class SeenFault {
+  kNone,
+  kFailedAuthentication,
+  kInvalidSecurityToken,
+  /// Of the request (Web Services Security: SOAP Message Security 1.1, section 10; a code of the
+  /// family is also sent for other faults).
+  kRefusedTimestamp,
+  kOther
+};
 
 /// Whether the fault refuses the credentials or the token of the request.
 bool IsRefusal(SeenFault fault) noexcept;

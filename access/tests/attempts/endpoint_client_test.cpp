@@ -9,6 +9,7 @@
 
 #include "attempts/endpoint_fixture.h"
 #include "calls/freed_memory.h"
+#include "secret_text.h"
 #include "support/holder_of_key.h"
 
 namespace SsoClient::Access {
@@ -146,15 +147,44 @@ TEST_F(EndpointClientTest, RefusesWhatNoAttemptCanUse) {
   refused(config, "https://sts.example/");
 }
 
-TEST_F(EndpointClientTest, LeavesNoPasswordInFreedMemory) {
-  const std::string password = "a password that occurs nowhere else";
-  const auto client = CreateEndpointClient(Config(), {"http://127.0.0.1:1/", ""});
-  const TokenSpec spec = TenMinutes();
-  const SsoClient::Testing::FreedMemory memory(password);
-  const AttemptOutcome outcome =
-      client->Attempt({AttemptOperation::kLogin, spec, nullptr, password}, *AMinute());
-  EXPECT_EQ(outcome.kind, FailureKind::kUnreachable);
-  EXPECT_EQ(memory.Finds(), 0);
+// ---- the password in released memory
+
+constexpr char kLongPassword[] = "Nowhere-else:0123456789abcdefghijklmnopqrstuvwxyz";
+// So short that a copy which was released early, before the text was complete, is found as well.
+constexpr std::size_t kPiece = 10;
+
+class FreedPasswordTest : public EndpointTest {
+ protected:
+  /// What the blocks that an attempt releases hold of the password, but not those of its outcome.
+  AttemptOutcome AttemptAt(const std::string& url) {
+    const auto client = CreateEndpointClient(Config(), {url, ""});
+    const auto limit = AMinute();
+    const SsoClient::Testing::FreedMemory memory(password_, kPiece);
+    AttemptOutcome outcome =
+        client->Attempt({AttemptOperation::kLogin, spec_, nullptr, password_}, *limit);
+    finds_ = memory.Finds();
+    return outcome;
+  }
+
+  const std::string password_ = kLongPassword;
+  const TokenSpec spec_ = TenMinutes();
+  int finds_ = -1;
+};
+
+TEST_F(FreedPasswordTest, NothingOfItRemainsWhenNoServiceIsReached) {
+  EXPECT_EQ(AttemptAt("http://127.0.0.1:1/").kind, FailureKind::kUnreachable);
+  EXPECT_EQ(finds_, 0);
+}
+
+TEST_F(FreedPasswordTest, HidingAnEchoReleasesNothingOfIt) {
+  for (const std::string& before : {std::string("no user with ["), std::string(5000, 'a')}) {
+    std::string text = before + kLongPassword + "&amp;] &lt;" + kLongPassword;
+    const SsoClient::Testing::FreedMemory memory(password_, kPiece);
+    std::string shown = HideSecret(std::move(text), password_);
+    const std::string record = ToRecordText(shown);
+    shown = std::string();
+    EXPECT_EQ(memory.Finds(), 0) << record;
+  }
 }
 
 }  // namespace

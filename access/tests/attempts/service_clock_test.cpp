@@ -70,6 +70,22 @@ TEST_F(ServiceClockTest, ARefusedTimestampNamesBothClocks) {
   EXPECT_LT(OffsetOf(outcome), -60s);
 }
 
+// The client does not read the answers of these statuses.
+TEST_F(ServiceClockTest, ARefusedTimestampNamesBothClocksWithAnyHttpStatus) {
+  for (const int status : {400, 403, 503}) {
+    for (const char* code : {"InvalidSecurity", "MessageExpired"}) {
+      DevSts::Misbehavior refusal;
+      refusal.fault = DevSts::FaultAnswer{SsoClient::Testing::kSecext, code, "why", false, status};
+      refusal.extraHeaders = {{"Date", HttpDate(std::chrono::system_clock::now() - 90s)}};
+      Sts().SetMisbehavior(refusal);
+      EXPECT_THAT(ExpectFailure<CommunicationException>(AttemptHere(), FailureKind::kFault),
+                  MatchesRegex(".*" + std::to_string(status) +
+                               ".* The service's clock reads [-0-9T:.]+Z, "
+                               "this system's [-0-9T:.]+Z\\."));
+    }
+  }
+}
+
 TEST_F(ServiceClockTest, WithoutADateARefusedTimestampIsReportedAsItIs) {
   DevSts::ServerOptions options;
   options.clockSkew = -90s;

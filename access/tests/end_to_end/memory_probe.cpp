@@ -1,8 +1,8 @@
 // Logs in, and looks for a text in its memory:
 // memory_probe WHERE URL CA_FILE SIGNING_CERTIFICATE_FILE PASSWORD TEXT
 // The password and the text are given backwards. The exit status is the number of places where the
-// text is: "freed" counts blocks that were released with it until the source was, "memory" all
-// writable memory while the token is in the cache.
+// text is: "freed" counts blocks that were released with any ten bytes of it until the source was,
+// "memory" all writable memory while the token is in the cache.
 #include <algorithm>
 #include <chrono>
 #include <cstddef>
@@ -27,6 +27,8 @@ using SsoClient::Access::TokenSourceConfig;
 using SsoClient::Access::Testing::ProbeSpec;
 
 constexpr int kMostPlaces = 100;
+// Also finds copies that were released before they were complete.
+constexpr std::size_t kPiece = 10;
 
 std::shared_ptr<TokenSource> MakeSource(char** argv) {
   TokenSourceConfig config = SsoClient::Access::Testing::ProbeConfig(argv[2], argv[3], argv[4]);
@@ -48,7 +50,7 @@ void LogIn(TokenSource& source) {
 
 int CountFreed(char** argv) {
   const std::string_view backwards = argv[6];
-  const SsoClient::Testing::FreedMemory memory({backwards.rbegin(), backwards.rend()});
+  const SsoClient::Testing::FreedMemory memory({backwards.rbegin(), backwards.rend()}, kPiece);
   auto source = MakeSource(argv);
   LogIn(*source);
   source.reset();

@@ -17,11 +17,12 @@ namespace SsoClient::Access {
 /// What an attempt asks the service for.
 enum class AttemptOperation { kLogin, kRenewal, kExchange };
 
-/// One request, or one negotiation, at one endpoint.
+/// One request, or one negotiation, at one endpoint; or a failed call of the function of a
+/// `PasswordLogin`, which no endpoint is chosen for.
 struct AttemptRecord {
   std::string source;    ///< `TokenSourceConfig::name`
   std::uint64_t id = 0;  ///< the same when it begins and when it ends; unique in the source
-  std::string endpoint;  ///< the URL as configured
+  std::string endpoint;  ///< the URL as configured; empty if no endpoint was chosen
   AttemptOperation operation = AttemptOperation::kLogin;
   bool isRefresh = false;  ///< begun in the background, for a key that has a usable token
   int number = 1;          ///< 1 for the first attempt of a request, 2 for the second
