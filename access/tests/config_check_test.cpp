@@ -37,17 +37,7 @@ struct BadConfig {
   std::function<void(TokenSourceConfig&)> spoil;
 };
 
-std::vector<BadConfig> BadConfigs() {
-  using std::chrono::milliseconds;
-  using std::chrono::seconds;
-  constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
-  const char* fraction =
-      "The fraction of the lifetime after which tokens are refreshed is not between 0 and 1.";
-  const char* jitter = "The jitter of refreshes is not between 0 and 1.";
-  const char* limit = "The limit of an attempt is not between 1 ms and 240 s.";
-  const char* text =
-      "The text holds what XML cannot carry: a control character or bytes that are not UTF-8.";
-  const char* delay = "A delay between attempts is not positive.";
+std::vector<BadConfig> BadLogins() {
   return {
       {"There is no endpoint.", [](auto& config) { config.endpoints.clear(); }},
       {"The token factory is null.", [](auto& config) { config.tokenFactory = nullptr; }},
@@ -61,14 +51,39 @@ std::vector<BadConfig> BadConfigs() {
        [](auto& config) { config.login = NegotiatedLogin{}; }},
       {"The source of the token to exchange is null.",
        [](auto& config) { config.login = TokenLogin{}; }},
+      {"Some endpoints are https URLs and others http URLs: a failure of TLS would send the login "
+       "in "
+       "plain text.",
+       [](auto& config) {
+         config.endpoints.push_back({"http://sts.example.com", ""});
+       }},
+  };
+}
+
+std::vector<BadConfig> BadRefreshes() {
+  constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+  const char* fraction =
+      "The fraction of the lifetime after which tokens are refreshed is not between 0 and 1.";
+  const char* jitter = "The jitter of refreshes is not between 0 and 1.";
+  return {
       {fraction, [](auto& config) { config.refresh.fraction = 0; }},
       {fraction, [](auto& config) { config.refresh.fraction = 1; }},
       {fraction, [](auto& config) { config.refresh.fraction = -0.5; }},
       {fraction, [](auto& config) { config.refresh.fraction = kNaN; }},
       {jitter, [](auto& config) { config.refresh.jitter = -0.1; }},
+      {jitter, [](auto& config) { config.refresh.jitter = 1.1; }},
       {jitter, [](auto& config) { config.refresh.jitter = kNaN; }},
       {"The longest margin of a token is negative.",
-       [](auto& config) { config.refresh.longestMargin = seconds(-1); }},
+       [](auto& config) { config.refresh.longestMargin = std::chrono::seconds(-1); }},
+  };
+}
+
+std::vector<BadConfig> BadRetries() {
+  using std::chrono::milliseconds;
+  using std::chrono::seconds;
+  const char* limit = "The limit of an attempt is not between 1 ms and 240 s.";
+  const char* delay = "A delay between attempts is not positive.";
+  return {
       {"The number of attempts is not positive.", [](auto& config) { config.retry.attempts = 0; }},
       {"The number of attempts at once is not positive.",
        [](auto& config) { config.retry.attemptsAtOnce = 0; }},
@@ -82,12 +97,13 @@ std::vector<BadConfig> BadConfigs() {
        [](auto& config) { config.retry.failuresToOpen = 0; }},
       {"The time for which a refused login is remembered is negative.",
        [](auto& config) { config.retry.refusalMemory = seconds(-1); }},
-      {"Some endpoints are https URLs and others http URLs: a failure of TLS would send the login "
-       "in "
-       "plain text.",
-       [](auto& config) {
-         config.endpoints.push_back({"http://sts.example.com", ""});
-       }},
+  };
+}
+
+std::vector<BadConfig> BadCaches() {
+  const char* text =
+      "The text holds what XML cannot carry: a control character or bytes that are not UTF-8.";
+  return {
       {text, [](auto& config) { config.keepFresh = {SpecFor("\x01")}; }},
       {"The capacity of the cache is 0.", [](auto& config) { config.cache.capacity = 0; }},
       {"The lifetime of the token is not positive.",
@@ -109,14 +125,16 @@ TEST(ConfigCheckTest, GoodConfigIsAccepted) {
 }
 
 TEST(ConfigCheckTest, BadConfigIsRefusedWithItsReason) {
-  for (const BadConfig& bad : BadConfigs()) {
-    TokenSourceConfig config = Good();
-    bad.spoil(config);
-    try {
-      CreateTokenSource(config);
-      ADD_FAILURE() << bad.message;
-    } catch (const Tarnik::InvalidArgumentException& refusal) {
-      EXPECT_EQ(refusal.Message(), bad.message);
+  for (const auto& group : {BadLogins(), BadRefreshes(), BadRetries(), BadCaches()}) {
+    for (const BadConfig& bad : group) {
+      TokenSourceConfig config = Good();
+      bad.spoil(config);
+      try {
+        CreateTokenSource(config);
+        ADD_FAILURE() << bad.message;
+      } catch (const Tarnik::InvalidArgumentException& refusal) {
+        EXPECT_EQ(refusal.Message(), bad.message);
+      }
     }
   }
 }

@@ -9,6 +9,7 @@
 
 #include "attempts/endpoint_fixture.h"
 #include "calls/freed_memory.h"
+#include "secret.h"
 #include "secret_text.h"
 #include "support/holder_of_key.h"
 
@@ -174,6 +175,15 @@ class FreedPasswordTest : public EndpointTest {
 TEST_F(FreedPasswordTest, NothingOfItRemainsWhenNoServiceIsReached) {
   EXPECT_EQ(AttemptAt("http://127.0.0.1:1/").kind, FailureKind::kUnreachable);
   EXPECT_EQ(finds_, 0);
+}
+
+TEST_F(FreedPasswordTest, SecretReleasesNothingOfIt) {
+  const SsoClient::Testing::FreedMemory memory(password_, kPiece);
+  {
+    const Secret secret{std::string(kLongPassword)};
+    ASSERT_EQ(secret.text, password_);
+  }
+  EXPECT_EQ(memory.Finds(), 0);
 }
 
 TEST_F(FreedPasswordTest, HidingAnEchoReleasesNothingOfIt) {

@@ -203,7 +203,7 @@ TEST_F(FailoverAsyncTest, AnOpenCircuitIsProbedAndCloses) {
   DevSts::Server other;
   TokenSourceConfig config = ConfigFor({&healthy_, &other});
   config.retry.failuresToOpen = 1;
-  // The pause before a probe is random from zero to this.
+  // The pause before a probe is random, and at least half of this.
   config.retry.firstDelay = config.retry.longestDelay = 1ms;
   config.retry.attempts = 100;
   healthy_.SetMisbehavior(Resetting());

@@ -171,11 +171,38 @@ class AnotherCaller : public SilentSts {
   TokenCalls other_;
 };
 
+/// Another caller has the only place for an attempt.
+class Turn final : public AnotherCaller {
+ public:
+  Turn() : AnotherCaller(SpecFor("https://stock.example.com")) {}
+
+  TokenSourceConfig Config() override {
+    TokenSourceConfig config = BoundConfigFor({&sts_});
+    config.login = CertificateLogin{};
+    config.retry.attemptsAtOnce = 1;
+    return config;
+  }
+};
+
+/// The source of the token to exchange waits for an answer.
+class BaseOfAnotherSource final : public SilentSts {
+ public:
+  BaseOfAnotherSource() : SilentSts(DevSts::Stall::BeforeAnswer) {}
+
+  TokenSourceConfig Config() override {
+    TokenSourceConfig config = BoundConfigFor({&sts_});
+    TokenSourceConfig base = BoundConfigFor({&sts_});
+    base.login = CertificateLogin{};
+    config.login = TokenLogin{CreateTokenSource(base), SpecFor("https://base.example.com")};
+    return config;
+  }
+};
+
 class PauseBetweenAttempts final : public Situation {
  public:
   TokenSourceConfig Config() override {
     TokenSourceConfig config = PasswordLoginAt(LoopbackUrl(port_));
-    // Random from zero to this.
+    // The pause is random, and at least half of this.
     config.retry.firstDelay = config.retry.longestDelay = std::chrono::hours(1000);
     return config;
   }
@@ -240,6 +267,30 @@ class SlowLoginFunction final : public Situation {
   const std::shared_ptr<Gate> gate_ = std::make_shared<Gate>();
 };
 
+class SlowHandlerFunction final : public Situation {
+ public:
+  ~SlowHandlerFunction() override { gate_->Open(); }
+
+  TokenSourceConfig Config() override {
+    TokenSourceConfig config = PasswordLoginAt(LoopbackUrl(1));
+    config.login = NegotiatedLogin{[gate = gate_](const Endpoint&) {
+      gate->Pass();
+      return std::shared_ptr<NegotiationHandler>();
+    }};
+    return config;
+  }
+  bool Await(const TokenSource& /*source*/, const AwaitingListener& /*listener*/) override {
+    return gate_->Await(1);
+  }
+  bool AwaitNothingLeft() override {
+    gate_->Open();
+    return true;
+  }
+
+ private:
+  const std::shared_ptr<Gate> gate_ = std::make_shared<Gate>();
+};
+
 template <class Kind, class... Arguments>
 std::function<std::unique_ptr<Situation>()> Makes(Arguments... arguments) {
   return [arguments...] { return std::make_unique<Kind>(arguments...); };
@@ -255,7 +306,10 @@ std::vector<Stage> AllStages() {
   return {
       {"RequestOfAnother", Makes<AnotherCaller>(SpecFor("https://orders.example.com"))},
       {"LoginOfAnother", Makes<AnotherCaller>(SpecFor("https://stock.example.com"))},
+      {"Turn", Makes<Turn>()},
+      {"BaseOfAnotherSource", Makes<BaseOfAnotherSource>()},
       {"LoginFunction", Makes<SlowLoginFunction>()},
+      {"HandlerFunction", Makes<SlowHandlerFunction>()},
       {"Pause", Makes<PauseBetweenAttempts>()},
       {"LookUp", Makes<LookUp>()},
       {"Connect", Makes<UnansweredConnect>()},

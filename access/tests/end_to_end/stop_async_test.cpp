@@ -135,6 +135,24 @@ TEST_F(StopAsyncTest, RefreshesUnderWayEnd) {
   ExpectStopped();
 }
 
+TEST_F(StopAsyncTest, TheDestructorDoesNotWaitForAFunctionThatBlocks) {
+  const auto gate = std::make_shared<Gate>();
+  TokenSourceConfig config = ConfigFor({&sts_});
+  config.login = PasswordLogin{kUser, [gate] {
+                                 gate->Pass();
+                                 return std::string(kPassword);
+                               }};
+  source_ = Make(config);
+  calls_.Begin(*source_, SpecFor(0));
+  ASSERT_TRUE(gate->Await(1));
+  auto destroyed = std::async(std::launch::async, [this] { source_.reset(); });
+  EXPECT_EQ(destroyed.wait_for(20s), std::future_status::ready);
+  const Result result = calls_.Wait().front();
+  EXPECT_TRUE(result.Is<Tarnik::InvalidStateException>()) << result.type;
+  EXPECT_EQ(result.reports, 1);
+  gate->Open();
+}
+
 // Their code may be that of a plug-in, which is unloaded next.
 TEST_F(StopAsyncTest, NothingOfTheUserIsLeftAfterTheDestructor) {
   sts_.ClearMisbehavior();
