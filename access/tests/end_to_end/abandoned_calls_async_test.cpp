@@ -52,10 +52,9 @@ class AbandonedCallsAsyncTest : public EndToEndTest {
       return seen.begun.size() >= kAtOnce && seen.ended.size() == seen.begun.size();
     }));
     const std::vector<AttemptRecord> ended = listener_->Seen().ended;
-    return static_cast<std::size_t>(
-        std::count_if(ended.begin(), ended.end(), [](const AttemptRecord& attempt) {
-          return attempt.failure == FailureKind::kAbandoned;
-        }));
+    return static_cast<std::size_t>(std::count_if(
+        ended.begin(), ended.end(),
+        [](const AttemptRecord& attempt) { return attempt.failure == FailureKind::kAbandoned; }));
   }
   /// The shortest time of a few calls that reach the healthy service.
   Clock::duration BestCall() {
