@@ -25,6 +25,10 @@ void Release(void* memory) noexcept {
 
 }  // namespace
 
+FreedMemory::FreedMemory(std::string text) : text_(std::move(text)), piece_(text_.size()) {
+  current = this;
+}
+
 FreedMemory::FreedMemory(std::string text, std::size_t piece)
     : text_(std::move(text)), piece_(piece) {
   current = this;

@@ -11,7 +11,7 @@ namespace SsoClient::Testing {
 /// this, the program replaces `operator delete`. At most one object may exist at a time.
 class FreedMemory {
  public:
-  explicit FreedMemory(std::string text) : FreedMemory(text, text.size()) {}
+  explicit FreedMemory(std::string text);
   /// Searches for any `piece` bytes of the text that follow each other. At most all of them.
   FreedMemory(std::string text, std::size_t piece);
   FreedMemory(const FreedMemory&) = delete;

@@ -138,12 +138,12 @@ class SlowLookUpSpec final : public CustomConnectionSpec, public ObjectImpl {
   std::promise<void> answer;
 };
 
-// The message of an exchange whose look-up takes longer than `limit`.
+// The message of an exchange whose look-up takes longer than `limit` milliseconds.
 std::string MessageAfterSlowLookUp(std::uint32_t limit) {
   const auto spec = MakeRef<SlowLookUpSpec>();
   const auto agent = CreateHttpUserAgent(spec.get(), nullptr, nullptr);
   const auto record = std::make_shared<CompletionRecord>();
-  const auto item = agent->SendAsync(PostRequest().get(), RecordIn(record), limit);
+  const auto item = agent->SendAsync(PostRequest().get(), RecordIn(record), limit * 1000UL);
   EXPECT_THROW(agent->Wait(item.get(), 0), TimeoutException);
   spec->answer.set_value();
   return record->message;
