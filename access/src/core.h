@@ -90,6 +90,9 @@ class Core : public std::enable_shared_from_this<Core> {
   void CheckContext(const CallContext& context, const Instant& now) const;
   TokenCache::Hit FindHit(const TokenSpec& spec, const CallContext& context);
   void RefreshLate(const TokenSpec& spec) noexcept;
+  void EndAll(State state, const Failure& failure) noexcept;
+
+  // callers that wait: callers.cpp
   void Wait(const TokenSpec& spec, const WaiterPtr& waiter);
   Joined TryJoin(const TokenSpec& spec, const WaiterPtr& waiter);
   Joined Join(Section& section, const TokenSpec& spec, const WaiterPtr& waiter);
@@ -106,7 +109,6 @@ class Core : public std::enable_shared_from_this<Core> {
                   const Instant& now) noexcept;
   void GiveTooShort(Section& section, const RequestPtr& request,
                     std::chrono::microseconds granted) noexcept;
-  void EndAll(State state, const Failure& failure) noexcept;
 
   // steps of requests: request_steps.cpp
   void StartWork(const RequestPtr& request) noexcept;

@@ -93,6 +93,10 @@ Failure Failure::Copy(const Tarnik::Exception& exception) noexcept {
   });
 }
 
+Failure Failure::Cancelled() {
+  return Of(Tarnik::CancelledException("The call was cancelled by its caller."));
+}
+
 Failure Failure::OutOfMemory() noexcept {
   Failure failure;
   failure.exception_ = SharedOutOfMemory();

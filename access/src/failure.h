@@ -47,6 +47,8 @@ class Failure {
   }
   /// Needs no memory.
   static Failure OutOfMemory() noexcept;
+  /// What a call receives that its caller has cancelled.
+  static Failure Cancelled();
   /// The exception that is being handled.
   static Failure Current() noexcept { return Failure(std::current_exception()); }
   /// The result of `make`, which returns a failure; `OutOfMemory` without memory.
