@@ -37,6 +37,11 @@ SourceFixture::SourceFixture() {
   ForAll(Issues(hours(1)));
 }
 
+SourceFixture::~SourceFixture() {
+  source.reset();
+  runtime->DropWork();
+}
+
 void SourceFixture::UseCertificate() {
   config.login = CertificateLogin{};
   config.holderOfKey = HolderOfKeyConfig{Tarnik::MakeRef<NamedCertificate>("own"), nullptr};

@@ -38,6 +38,8 @@ struct Reply {
 class SourceFixture : public ::testing::Test {
  protected:
   SourceFixture();
+  /// Callbacks of calls that are still waiting run here.
+  ~SourceFixture() override;
 
   /// Attempts of these logins are cancelled when all callers have left; see `AbandonedLoginTest`.
   void UseCertificate();
