@@ -48,7 +48,7 @@ class EndpointSet {
   /// True when an endpoint that may be asked has a free place.
   bool HasPlace(Instant::Steady now) const noexcept;
   /// Takes a place at the next endpoint that is not in `asked`, may be asked and has one. Not set
-  /// when there is none.
+  /// when no endpoint has one.
   std::optional<Index> TakePlace(const Asked& asked, Instant::Steady now,
                                  Order order = Order::kPreferredFirst) noexcept;
   void ReturnPlace(Index index) noexcept { --members_[index].underWay; }
