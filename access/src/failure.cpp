@@ -63,7 +63,8 @@ Reason MakeReason(FailureKind kind, const std::string& text) noexcept {
   }
 }
 
-Failure::Failure(const std::exception_ptr& exception) noexcept : foreign_(exception) {
+Failure::Failure(const std::exception_ptr& exception) noexcept {
+  foreign_ = exception;
   reason_.kind = FailureKind::kLocal;
   try {
     std::rethrow_exception(exception);

@@ -45,14 +45,15 @@ struct Request {
   bool mayRenew = true;
   /// An endpoint that did not decide a renewal may decide a login.
   bool wasRenewalSent = false;
+  /// The first token to exchange has been refused.
+  bool hasReplacedBase = false;
+  /// There is no token to exchange that is valid for `baseLife`.
+  bool takesAnyBase = false;
   /// The tag of the secret whose gate it has or waits for.
   std::optional<LoginGate::Tag> gate;
-  /// The token to exchange for `TokenLogin`, and whether the first one has been refused.
+  /// The token to exchange for `TokenLogin`, and how long the last one asked for had to be valid.
   std::shared_ptr<const SamlToken> base;
-  bool hasReplacedBase = false;
-  /// How long the last one asked for had to be valid, and whether none is valid for that long.
   std::chrono::seconds baseLife{0};
-  bool takesAnyBase = false;
   /// Ends the request for `base`.
   CancellationSource cancellation;
 
