@@ -39,7 +39,7 @@ class FaultyStream final : public Tarnik::System::Stream, public Tarnik::ObjectI
   void Close() noexcept override { below_->Close(); }
 
   bool HasFaulted() const { return hasFaulted_; }
-  /// What a failure because of the fault says; empty if there is none.
+  /// What a failure because of the fault says; empty without a fault.
   std::string FaultText() const;
 
  private:

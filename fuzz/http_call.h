@@ -33,7 +33,7 @@ class HttpCall {
   bool Says(const std::string& text) const { return failure_.find(text) != std::string::npos; }
   Tarnik::Http::PendingRequestItem* Item() const { return item_.get(); }
 
-  /// It has ended with this answer, or failed if there is none.
+  /// It has ended with this answer; without one, it has failed.
   void RequireEnd(const std::optional<ParsedAnswer>& expected) const;
 
  private:

@@ -249,7 +249,6 @@ TEST_F(AttemptsAtOnceTest, GateDoesNotHoldPlaces) {
   config.endpoints.resize(1);
   config.retry.attemptsAtOnce = 2;
   MakeAccepted();
-  ForAll(Holds());
   bool isFirst = true;
   scripts[0]->Set([&](const AttemptRequest&, Limit&) {
     runtime->Settle();
