@@ -7,6 +7,7 @@
 #include <vector>
 
 #include <tarnik/core/ref.h>
+#include <tarnik/crypto/digest.h>
 #include <tarnik/crypto/public_key.h>
 #include <tarnik/system/date_time.h>
 
@@ -42,6 +43,24 @@ TARNIK_EXPORT std::vector<Ref<const Certificate>> CreateCertificatesFromPem(std:
 /// Reads a file of PEM certificates. Throws `IOException` when it cannot be read, and otherwise as
 /// above.
 TARNIK_EXPORT std::vector<Ref<const Certificate>> LoadCertificates(const std::string& path);
+/// Reads the content of a certificate file in either usual form: every CERTIFICATE block of a PEM
+/// text, in order, or, if there is no block of any label, one certificate in DER. Throws
+/// `CryptoException` when it is neither.
+TARNIK_EXPORT std::vector<Ref<const Certificate>> CreateCertificatesFromPemOrDer(
+    std::string_view content);
+/// Reads a file of either form. Throws `IOException` when it cannot be read, and otherwise as
+/// above.
+TARNIK_EXPORT std::vector<Ref<const Certificate>> LoadPemOrDerCertificates(const std::string& path);
+
+/// True when both have the same DER encoding. Takes constant time for encodings of one length; only
+/// the lengths may show in the time.
+TARNIK_EXPORT bool IsSameCertificate(const Certificate& a, const Certificate& b) noexcept;
+/// The SHA-256 digest of the DER encoding. A certificate that this library has decoded computes it
+/// once. Throws `CryptoException` when it cannot be computed.
+TARNIK_EXPORT Sha256Digest Fingerprint(const Certificate& certificate);
+/// The fingerprint as tools print it: 32 pairs of upper-case hexadecimal digits with colons between
+/// them, "0A:1B:...". Throws as above.
+TARNIK_EXPORT std::string FingerprintText(const Certificate& certificate);
 
 }  // namespace Tarnik::Crypto
 

@@ -32,6 +32,20 @@ class TARNIK_EXPORT KeyCandidatesResolver : public KeyInfoResolver {
   virtual std::vector<Ref<const Crypto::PublicKey>> Candidates(const KeyInfo& keyInfo) const = 0;
 };
 
+/// A resolver whose keys are those of certificates, and that returns these too. A program can then
+/// check the signer's certificate, for example whether it is revoked. Callers may implement it;
+/// implementations must be thread-safe.
+class TARNIK_EXPORT CertificateCandidatesResolver : public KeyCandidatesResolver {
+ public:
+  /// The trusted certificates that a signature with `keyInfo` may have been made with, selected by
+  /// the rules of `Candidates` and in the same order; their keys are the keys that it returns.
+  /// Several certificates of one key are all returned, and `Candidates` returns that key once.
+  /// Certificates whose key cannot be used are not returned; if it is the only one that is
+  /// selected, `CryptoException` is thrown, as `Candidates` does.
+  virtual std::vector<Ref<const Crypto::Certificate>> CandidateCertificates(
+      const KeyInfo& keyInfo) const = 0;
+};
+
 /// Trusts exactly `certificates`. What the message says about its key only selects among them:
 ///  - Only the first kind of hint that is present is used, in this order: X509Certificate (one must
 ///    equal a trusted one byte for byte), X509IssuerSerial, X509SKI, X509SubjectName, X509Digest
@@ -47,7 +61,7 @@ class TARNIK_EXPORT KeyCandidatesResolver : public KeyInfoResolver {
 ///    certificates have no such names. If the list has only one certificate, X509Digest and keys
 ///    are not hints either.
 /// `Resolve` returns the selected key if there is exactly one. The validity periods of the
-/// certificates are not checked. The result also is a `KeyCandidatesResolver`. Throws
+/// certificates are not checked. The result also is a `CertificateCandidatesResolver`. Throws
 /// `InvalidArgumentException` when the list is empty or contains null.
 TARNIK_EXPORT Ref<const KeyInfoResolver> CreateTrustedCertificatesResolver(
     std::vector<Ref<const Crypto::Certificate>> certificates);
