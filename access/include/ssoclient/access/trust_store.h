@@ -1,0 +1,134 @@
+#ifndef SSOCLIENT_ACCESS_TRUST_STORE_H
+#define SSOCLIENT_ACCESS_TRUST_STORE_H
+
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <boost/optional.hpp>
+
+#include <ssoclient/access/export.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/system/date_time.h>
+
+namespace SsoClient::Access {
+
+/// Who may sign tokens of an issuer.
+///
+/// Paths are those of files and folders. Of a folder, the files directly in it count whose names
+/// end in ".pem", ".crt" or ".cer", for lists also ".crl", and do not begin with a dot. Symbolic
+/// links are followed. A file contains PEM blocks (RFC 7468) or one DER encoding; blocks of other
+/// kinds, such as private keys, are skipped.
+struct TrustedIssuer {
+  /// The text of the tokens' Issuer (SAML 2.0 core, section 2.2.5), compared byte for byte; empty
+  /// for the tokens of any issuer. Several entries for one issuer are used together.
+  std::string issuer{};
+  /// The certificates of the signing keys themselves. A certificate that one of them has issued is
+  /// not trusted.
+  std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>> certificates{};
+  std::vector<std::string> certificatePaths{};
+  /// Certificate revocation lists (RFC 5280, section 5). Without paths, revocation is not checked.
+  /// With them, each of the certificates must be covered by a list of its issuer that is not out of
+  /// date, or no token that it signed is accepted: also when a folder contains no list yet.
+  std::vector<std::string> revocationListPaths{};
+  /// The certificates of the authorities that sign these lists. They are not trusted to sign
+  /// tokens. A list that none of them, and none of the certificates above, has signed is an error.
+  std::vector<std::string> listSignerPaths{};
+};
+
+/// A trusted certificate, as it is used now.
+struct TrustedSigner {
+  std::string issuer{};  ///< `TrustedIssuer::issuer`
+  Tarnik::Ref<const Tarnik::Crypto::Certificate> certificate{};
+  std::string path{};  ///< the file that contained it; empty if it was given as an object
+  bool isRevocationChecked = false;
+  /// When it was revoked; none if it was not.
+  boost::optional<Tarnik::System::DateTime> revokedSince{};
+  /// When the list that covers it is out of date (nextUpdate); none without such a list.
+  boost::optional<Tarnik::System::DateTime> listUntil{};
+};
+
+/// The trust in use, and the last attempt to read it.
+struct TrustDescription {
+  std::vector<TrustedSigner> signers{};
+  Tarnik::System::DateTime loadedAt{};  ///< when this trust was read
+  /// Why the files as they are now were not accepted; empty if the trust in use is that of the
+  /// files, as far as they have been looked at.
+  std::string failure{};
+
+  /// A text of several lines for people, which ends in a line feed.
+  SSOCLIENT_ACCESS_EXPORT std::string ToString() const;
+};
+
+/// Changed files have been read, or could not be.
+struct TrustRecord {
+  std::string store{};    ///< `TrustStoreConfig::name`
+  std::string failure{};  ///< why the trust stays as it was; empty if it has been replaced
+  std::size_t added = 0;    ///< certificates, by their SHA-256
+  std::size_t removed = 0;  ///< certificates, by their SHA-256
+  std::size_t signers = 0;  ///< certificates in use now
+};
+
+/// Sees what a trust store does. The functions run on a worker thread of the platform, or on the
+/// one that calls `TrustStore::Reload`, one at a time for each store, and must not call `Reload`.
+/// Exceptions that leave them are ignored.
+class SSOCLIENT_ACCESS_EXPORT TrustListener {
+ public:
+  virtual ~TrustListener();
+  /// The trust has been replaced. Does nothing unless it is overridden, as does the next function.
+  virtual void OnTrustReplaced(const TrustRecord& record);
+  /// The files could not be read or decoded, and the trust stays as it was. Called once for each
+  /// new failure, not again while the files stay as they are.
+  virtual void OnTrustKept(const TrustRecord& record);
+};
+
+/// Writes a line to the log of the platform for each record: a replacement at level 4, a failure at
+/// level 2.
+SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustListener> CreateTrustLogListener();
+
+struct TrustStoreConfig {
+  /// Names the store in records and log lines; may be empty.
+  std::string name{};
+  /// At least one, each with a certificate or the path of one.
+  std::vector<TrustedIssuer> issuers{};
+  /// Whether the store looks for changes of the files by itself. It does so four times a second, by
+  /// their metadata, and reads changed files when they have stayed the same for a quarter of a
+  /// second, or after three quarters at the latest: a change counts within a second.
+  bool isWatching = true;
+  /// May be null.
+  std::shared_ptr<TrustListener> listener{};
+};
+
+/// The certificates that may sign tokens, from files that may change at any time. All files are
+/// read together: either the whole trust is replaced, or, when any file cannot be read or decoded,
+/// or a path does not exist, all of it stays as it was. A folder that exists and contains no
+/// certificate is not an error: whoever removes the last certificate of an issuer takes its trust
+/// away. Checks that are under way use the trust with which they began.
+///
+/// Replace a file by renaming a complete one over it. A file that is written in place may be read
+/// when it is incomplete, which is usually an error, but not if its first part ends between two
+/// certificates.
+///
+/// Thread-safe. In a forked child, a store that watches begins to watch again when it is used.
+/// Created only by `CreateTrustStore`: a gate accepts no other implementation.
+class SSOCLIENT_ACCESS_EXPORT TrustStore {
+ public:
+  virtual ~TrustStore();
+  /// Reads all files now. When it returns, the trust is that of the files. Throws what
+  /// `CreateTrustStore` throws for files; the trust then stays as it was.
+  virtual void Reload() = 0;
+  virtual TrustDescription Describe() const = 0;
+};
+
+/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no issuer, an issuer
+/// has neither a certificate nor a path of one, a certificate is null, and when there is no
+/// certificate at all, since a gate would refuse every token; `Tarnik::IOException` when a path
+/// does not exist or cannot be read; `Tarnik::Crypto::CryptoException` when a file contains no
+/// certificate or list, or one that cannot be used. The message names the file.
+SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustStore> CreateTrustStore(TrustStoreConfig config);
+
+}  // namespace SsoClient::Access
+
+#endif

@@ -1,0 +1,113 @@
+#ifndef SSOCLIENT_ACCESS_VERDICT_H
+#define SSOCLIENT_ACCESS_VERDICT_H
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <ssoclient/access/export.h>
+#include <ssoclient/saml_token.h>
+
+namespace SsoClient::Access {
+
+/// The checks of a token, in the order in which they are made. Later versions may add some.
+enum class CheckKind {
+  kSize,           ///< the length of the text
+  kWellFormed,     ///< XML, as `Tarnik::Xml::XMLParser` accepts it
+  kLayout,         ///< one assertion of the accepted structure (`CreateSamlToken`)
+  kValidity,       ///< NotBefore and NotOnOrAfter of its Conditions
+  kSignerKnown,    ///< its KeyInfo names a certificate that is trusted for its issuer
+  kSignerValid,    ///< the validity of that certificate
+  kSignerRevoked,  ///< that certificate is not revoked
+  kSignature,      ///< made with the key of that certificate, and covers the assertion
+  kAudience,       ///< its audiences
+  kConfirmation,   ///< bearer or holder-of-key
+  kPossession,     ///< the presenter's proof that it has the key of a holder-of-key token
+  kLifetime,       ///< the length of its validity
+  kDelegation,     ///< the length of its delegation chain
+  kGroups,         ///< the groups of its subject
+  kPredicate,      ///< `GateConfig::predicate`
+};
+
+enum class CheckOutcome { kPassed, kFailed, kNotReached };
+
+/// Why a token was refused, for programs. Later versions may add some.
+enum class Reason {
+  kNone,                  ///< it was not refused
+  kTooLarge,              ///< its text is longer than `GateConfig::largestToken`
+  kNotWellFormed,         ///< its text is not XML that is accepted
+  kBadLayout,             ///< it is not an assertion of the accepted structure
+  kNotYetValid,           ///< NotBefore is in the future
+  kExpired,               ///< NotOnOrAfter has passed
+  kUnknownIssuer,         ///< nobody is trusted to sign tokens of its issuer
+  kUnknownSigner,         ///< it names no certificate that is trusted for its issuer
+  kSignerNotYetValid,     ///< the validity of its signer's certificate has not begun
+  kSignerExpired,         ///< the validity of its signer's certificate has ended
+  kSignerRevoked,         ///< its signer's certificate is on a revocation list
+  kRevocationUnknown,     ///< no current list covers its signer's certificate, but one must
+  kBadSignature,          ///< its signature does not verify with its signer's key
+  kWrongAudience,         ///< it is restricted to other audiences
+  kUnrestricted,          ///< it is not restricted to audiences, but must be
+  kBearerRefused,         ///< it is a bearer token, which the gate refuses
+  kNoProof,               ///< its key was not proved, since the presenter is `Presenter::Nobody`
+  kWrongProof,            ///< the presenter proved another key, or nothing
+  kTooLongLived,          ///< its lifetime is longer than `GateConfig::longestLifetime`
+  kTooDeeplyDelegated,    ///< it has more delegates than `GateConfig::deepestDelegation`
+  kNotInGroup,            ///< its subject is in none of `GateConfig::allowedGroups`
+  kRefusedByPredicate,    ///< `GateConfig::predicate` returned false
+  kPredicateFailed,       ///< `GateConfig::predicate` threw
+};
+
+/// The names in lower case with hyphens, such as "signer-known" and "wrong-audience"; valid for the
+/// lifetime of the process.
+SSOCLIENT_ACCESS_EXPORT const char* NameOf(CheckKind check) noexcept;
+SSOCLIENT_ACCESS_EXPORT const char* NameOf(CheckOutcome outcome) noexcept;
+SSOCLIENT_ACCESS_EXPORT const char* NameOf(Reason reason) noexcept;
+
+/// A line of the ledger.
+struct CheckRecord {
+  CheckKind check = CheckKind::kSize;
+  CheckOutcome outcome = CheckOutcome::kNotReached;
+  /// What was compared with what, without control characters, and at most 1000 bytes long; empty
+  /// when the check was not reached. Names people and certificates, but contains neither the text
+  /// of the token nor a signature. Before the signature has been verified, it is what the token
+  /// claims.
+  std::string compared{};
+};
+
+struct VerdictFacts;
+
+/// What a gate has decided about a token. A value, whose copies share their content; thread-safe as
+/// one. References that it returns are valid as long as any copy.
+class SSOCLIENT_ACCESS_EXPORT Verdict {
+ public:
+  bool IsAccepted() const noexcept;
+  /// The accepted token; null when it was refused.
+  const std::shared_ptr<const SamlToken>& Token() const noexcept;
+  /// `Reason::kNone` for an accepted token.
+  Reason Refusal() const noexcept;
+  /// Why the token was refused, for people, with the rules of `CheckRecord::compared`; empty for an
+  /// accepted token. It says which audiences and signers this service knows: for its log, not for
+  /// its answer to the presenter.
+  const std::string& Message() const noexcept;
+  /// A record for each `CheckKind`, in order. The texts are made by this call.
+  std::vector<CheckRecord> Ledger() const;
+  /// The ledger as a text of several lines for people, which ends in a line feed.
+  std::string ToString() const;
+
+  /// Verdicts for implementations of `TokenGate` of a program's own. In their ledgers, all checks
+  /// have passed, or none has been reached. Throw `Tarnik::InvalidArgumentException` for null and
+  /// for `Reason::kNone`.
+  static Verdict Accept(std::shared_ptr<const SamlToken> token);
+  static Verdict Refuse(Reason reason, std::string message);
+
+  /// For the library.
+  explicit Verdict(std::shared_ptr<const VerdictFacts> facts) noexcept;
+
+ private:
+  std::shared_ptr<const VerdictFacts> facts_;
+};
+
+}  // namespace SsoClient::Access
+
+#endif
