@@ -23,7 +23,9 @@ class SSOCLIENT_ACCESS_EXPORT Presenter {
   /// The sender has proved in a TLS handshake that it has the key of `certificate`. The server must
   /// have required and verified that proof, as TLS libraries do for client certificates; the
   /// certificate need not be issued by anybody that the server trusts, since the token names it.
-  /// Null, which such libraries return for a client without a certificate, counts as `Nobody`.
+  /// Null, which such libraries return for a client without a certificate, counts as `Nobody`. The
+  /// certificate must come from the server's own connection: one in a header is a claim of whoever
+  /// can reach the server.
   static Presenter WithTlsCertificate(Tarnik::Ref<const Tarnik::Crypto::Certificate> certificate);
   /// The sender has sent `signature`, which is to be one of `data` by the token's key. The proof is
   /// worth what `data` is worth: it must contain something that the server chose for this exchange,

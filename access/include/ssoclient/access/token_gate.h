@@ -21,7 +21,8 @@ namespace SsoClient::Access {
 
 // Durations of the configuration that are longer than a thousand years count as a thousand years.
 
-/// Whether bearer tokens are accepted, which anybody can present who has seen them.
+/// Whether bearer tokens are accepted, which anybody can present who has seen them. A bearer token
+/// stays one when its presenter has a certificate.
 enum class BearerTokens { kNotSaid, kRefuse, kAccept };
 
 /// The tokens that a gate remembers, so that it need not read and verify them again.
@@ -57,7 +58,8 @@ struct GateConfig {
   std::vector<PrincipalId> allowedGroups{};
   /// The last check; may be empty. Returns whether the token is accepted; otherwise it may set
   /// `why`, which becomes the refusal's message. Called for each presentation of a token, on the
-  /// thread of the check, several at once. The token is refused if it throws.
+  /// thread of the check, several at once. The token is refused if it throws. Rules that depend on
+  /// the request are better checked after the verdict, on `Verdict::Token`.
   std::function<bool(const SamlToken& token, std::string& why)> predicate{};
   /// The longest text of a token in bytes; longer ones are refused before they are read.
   std::size_t largestToken = std::size_t{256} * 1024;
@@ -69,7 +71,7 @@ struct GateConfig {
 /// Counters since the gate was made, and gauges. They are read one by one while others work.
 struct GateMetrics {
   std::uint64_t accepted = 0;
-  /// By `Reason`, in the order of the enumeration; the first element is zero.
+  /// By `Reason`, in the order of the enumeration, with an element for each; the first is zero.
   std::vector<std::uint64_t> refused{};
   std::uint64_t cacheHits = 0;    ///< checks of a remembered token, whatever their verdict
   std::uint64_t cacheMisses = 0;  ///< checks that read the token
@@ -94,8 +96,15 @@ struct GateMetrics {
 class SSOCLIENT_ACCESS_EXPORT TokenGate {
  public:
   virtual ~TokenGate();
-  /// Checks `token`, the XML text of one SAML 2.0 assertion, which `presenter` has sent. Refusals
-  /// are verdicts: throws only `std::bad_alloc` and the exceptions of `GateConfig::clock`.
+  /// Checks `token`, the XML text of one SAML 2.0 assertion, which `presenter` has sent: a document
+  /// as `CreateSamlToken` accepts it, so white space and comments may be around the assertion.
+  /// Refusals are verdicts: throws only `std::bad_alloc` and the exceptions of `GateConfig::clock`.
+  ///
+  /// The text of an assertion in a larger document, such as a WS-Security header, is its canonical
+  /// text by Canonical XML 1.0 (`Tarnik::Xml::Security::CreateCanonicalizer`), which declares the
+  /// namespaces of the elements around it. The exclusive form leaves out those that only values
+  /// use. Conditions of SAML that the accepted layout does not contain are refused as
+  /// `Reason::kBadLayout`.
   virtual Verdict Check(const std::string& token, const Presenter& presenter) const = 0;
   virtual GateMetrics Metrics() const = 0;
 };

@@ -22,9 +22,12 @@ namespace SsoClient::Access {
 /// links are followed. A file contains PEM blocks (RFC 7468) or one DER encoding; blocks of other
 /// kinds, such as private keys, are skipped.
 struct TrustedIssuer {
-  /// The text of the tokens' Issuer (SAML 2.0 core, section 2.2.5), compared byte for byte; empty
-  /// for the tokens of any issuer. Several entries for one issuer are used together.
+  /// The text of the tokens' Issuer (SAML 2.0 core, section 2.2.5), compared byte for byte. Several
+  /// entries for one issuer are used together.
   std::string issuer{};
+  /// True, with an empty `issuer`, if the certificates may sign tokens of every issuer: only right
+  /// when there is one service, since each could sign in the name of another.
+  bool isForAnyIssuer = false;
   /// The certificates of the signing keys themselves. A certificate that one of them has issued is
   /// not trusted.
   std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>> certificates{};
@@ -73,7 +76,8 @@ struct TrustRecord {
 
 /// Sees what a trust store does. The functions run on a worker thread of the platform, or on the
 /// one that calls `TrustStore::Reload`, one at a time for each store, and must not call `Reload`.
-/// Exceptions that leave them are ignored.
+/// Exceptions that leave them are ignored. None is called after the destructor of the store has
+/// returned, unless that was called by the listener itself.
 class SSOCLIENT_ACCESS_EXPORT TrustListener {
  public:
   virtual ~TrustListener();
@@ -116,8 +120,9 @@ struct TrustStoreConfig {
 class SSOCLIENT_ACCESS_EXPORT TrustStore {
  public:
   virtual ~TrustStore();
-  /// Reads all files now. When it returns, the trust is that of the files. Throws what
-  /// `CreateTrustStore` throws for files; the trust then stays as it was.
+  /// Reads all files now, on this thread. When it returns, the trust is that of the files. Throws
+  /// what `CreateTrustStore` throws for files; the trust then stays as it was, and the listener has
+  /// been called, unless it knows this failure already.
   virtual void Reload() = 0;
   virtual TrustDescription Describe() const = 0;
 };

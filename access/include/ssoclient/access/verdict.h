@@ -58,6 +58,18 @@ enum class Reason {
   kPredicateFailed,       ///< `GateConfig::predicate` threw
 };
 
+/// Who can do something about a refusal.
+enum class Remedy {
+  kNone,      ///< nobody has to: it was accepted
+  kNewToken,  ///< the caller, with another token, or with the proof that it left out (HTTP 401)
+  kAccess,    ///< whoever grants access: another token of the subject will not help (HTTP 403)
+  kService,   ///< the operator of this service; the token may be good (HTTP 503)
+};
+
+/// `kService` for `kRevocationUnknown` and `kPredicateFailed`, `kAccess` for `kNotInGroup` and
+/// `kRefusedByPredicate`, and `kNewToken` for all other refusals.
+SSOCLIENT_ACCESS_EXPORT Remedy RemedyOf(Reason reason) noexcept;
+
 /// The names in lower case with hyphens, such as "signer-known" and "wrong-audience"; valid for the
 /// lifetime of the process.
 SSOCLIENT_ACCESS_EXPORT const char* NameOf(CheckKind check) noexcept;
@@ -86,13 +98,14 @@ class SSOCLIENT_ACCESS_EXPORT Verdict {
   const std::shared_ptr<const SamlToken>& Token() const noexcept;
   /// `Reason::kNone` for an accepted token.
   Reason Refusal() const noexcept;
-  /// Why the token was refused, for people, with the rules of `CheckRecord::compared`; empty for an
-  /// accepted token. It says which audiences and signers this service knows: for its log, not for
+  /// Why the token was refused, in one line for people, with the rules of `CheckRecord::compared`,
+  /// and without the name of the reason; empty for an accepted token. It says which audiences and signers this service knows: for its log, not for
   /// its answer to the presenter.
   const std::string& Message() const noexcept;
   /// A record for each `CheckKind`, in order. The texts are made by this call.
   std::vector<CheckRecord> Ledger() const;
-  /// The ledger as a text of several lines for people, which ends in a line feed.
+  /// The verdict as a text of several lines for people, which ends in a line feed: first the
+  /// decision, with the name of the reason and the message of a refusal, and then the ledger.
   std::string ToString() const;
 
   /// Verdicts for implementations of `TokenGate` of a program's own. In their ledgers, all checks
