@@ -129,6 +129,7 @@ void Core::NoteCircuit(Section& section, const Step& step, const Result& result,
              outcome.kind == FailureKind::kHttpStatus) {
     section.Circuit(endpoints_.OnUnclear(step.endpoint, result.reason, outcome.retryAfter,
                                          now.steady, runtime_->Draw()));
+    WakeHopeless(section, now);
   } else if (AllowsFailover(outcome.kind)) {
     section.Circuit(endpoints_.OnFailure(step.endpoint, result.reason, outcome.retryAfter,
                                          now.steady, runtime_->Draw()));
