@@ -167,7 +167,7 @@ std::vector<Variant> MakeVariants(std::size_t servers) {
   base.betweenCalls = hours(2);
   add("a call in 2 hours", [](FleetPlan&) {});
   add("- attempts of 5 s", [](FleetPlan& plan) { plan.retry.attemptTimeout = seconds(5); });
-  add("- attempts of 9 s", [](FleetPlan& plan) { plan.retry.attemptTimeout = seconds(9); });
+  add("- attempts of 10 s", [](FleetPlan& plan) { plan.retry.attemptTimeout = seconds(10); });
   add("- attempts of 30 s", [](FleetPlan& plan) { plan.retry.attemptTimeout = seconds(30); });
   add("- 1 failure opens", [](FleetPlan& plan) { plan.retry.failuresToOpen = 1; });
   return variants;

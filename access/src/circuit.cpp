@@ -1,5 +1,7 @@
 #include "circuit.h"
 
+#include <algorithm>
+
 #include "backoff.h"
 
 namespace SsoClient::Access {
@@ -21,25 +23,24 @@ void Circuit::OnAnswer() {
 }
 
 void Circuit::OnFailure(Instant::Steady now, std::chrono::milliseconds retryAfter, double draw) {
-  if (state_ == CircuitState::kOpen) {
-    return;  // an attempt from before
-  }
-  ++failures_;
-  const bool opens = state_ == CircuitState::kHalfOpen || failures_ >= config_.failuresToOpen;
-  if (opens) {
-    state_ = CircuitState::kOpen;
-    retryAt_ = now + Backoff(config_, failures_, retryAfter, draw);
-    return;
+  const bool isFromBefore = state_ == CircuitState::kOpen;
+  if (!isFromBefore) {
+    ++failures_;
+    if (state_ == CircuitState::kHalfOpen || failures_ >= config_.failuresToOpen) {
+      state_ = CircuitState::kOpen;
+      PutOff(now + Backoff(config_, failures_, retryAfter, draw));
+      return;
+    }
   }
   if (retryAfter > std::chrono::milliseconds(0)) {
-    retryAt_ = now + Backoff(config_, failures_, retryAfter, draw);
+    PutOff(now + Backoff(config_, failures_, retryAfter, draw));
   }
 }
 
 void Circuit::OnUnclear(Instant::Steady now, std::chrono::milliseconds retryAfter, double draw) {
   OnAbandoned();
   if (retryAfter > std::chrono::milliseconds(0)) {
-    retryAt_ = now + Backoff(config_, failures_ + 1, retryAfter, draw);
+    PutOff(now + Backoff(config_, failures_ + 1, retryAfter, draw));
   }
 }
 
@@ -47,6 +48,10 @@ void Circuit::OnAbandoned() {
   if (state_ == CircuitState::kHalfOpen) {
     state_ = CircuitState::kOpen;
   }
+}
+
+void Circuit::PutOff(Instant::Steady until) noexcept {
+  retryAt_ = std::max(retryAt_, until);
 }
 
 }  // namespace SsoClient::Access

@@ -38,6 +38,9 @@ class Circuit {
   void OnAbandoned();
 
  private:
+  /// What another attempt was asked to wait for still counts.
+  void PutOff(Instant::Steady until) noexcept;
+
   const RetryConfig config_;
   CircuitState state_ = CircuitState::kClosed;
   int failures_ = 0;

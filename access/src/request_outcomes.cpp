@@ -129,6 +129,7 @@ void Core::NoteCircuit(Section& section, const Step& step, const Result& result,
              outcome.kind == FailureKind::kHttpStatus) {
     section.Circuit(endpoints_.OnUnclear(step.endpoint, result.reason, outcome.retryAfter,
                                          now.steady, runtime_->Draw()));
+    WakeHopeless(section, now);
   } else if (AllowsFailover(outcome.kind)) {
     section.Circuit(endpoints_.OnFailure(step.endpoint, result.reason, outcome.retryAfter,
                                          now.steady, runtime_->Draw()));
@@ -292,8 +293,10 @@ int Core::AttemptLimit(const Request& request) const noexcept {
 void Core::EndRound(Section& section, const RequestPtr& request, const Instant& now) noexcept {
   const bool hasAsked =
       std::find(request->asked.begin(), request->asked.end(), true) != request->asked.end();
+  // An endpoint may have answered the renewal that this login follows with a `Retry-After`.
+  const bool isFollowUp = request->attempts > 0 && !request->waiters.empty();
   // After a pause, another request may be probing what this one has waited for.
-  const bool mayWait = hasAsked || request->rounds > 1;
+  const bool mayWait = hasAsked || isFollowUp || request->rounds > 1;
   const auto admission = endpoints_.NextAdmission();
   if (!mayWait || !admission || request->undecided >= AttemptLimit(*request)) {
     FailUndecided(section, request, now);

@@ -176,6 +176,35 @@ TEST_F(AttemptsAtOnceTest, ThoseWhoWaitFailAtOnceWhenAllCircuitsAreOpen) {
             std::string::npos);
 }
 
+TEST_F(AttemptsAtOnceTest, ThoseWhoWaitDoNotWaitForAnEndpointThatAsksARenewalToWait) {
+  config.endpoints.resize(1);
+  config.retry.attemptsAtOnce = 1;
+  Make();
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    const auto token = NewToken(hours(1));
+    token->isRenewable = true;
+    token->certificate = config.holderOfKey->certificate;
+    return Issued(token);
+  });
+  ASSERT_NE(Get(spec).token, nullptr);
+  std::shared_ptr<Reply> second;
+  scripts[0]->Set([&](const AttemptRequest& request, Limit&) {
+    EXPECT_EQ(request.operation, AttemptOperation::kRenewal);
+    second = Ask(SpecFor("second"));
+    runtime->Settle();
+    return Unavailable(minutes(1));
+  });
+  runtime->Advance(minutes(20));
+  CallContext context;
+  context.minimumLife = minutes(50);
+  const Reply first = Get(spec, context);
+  EXPECT_EQ(scripts[0]->Count(), 2U);
+  ASSERT_TRUE(second->Has());
+  EXPECT_NE(second->Message().find("it failed before: http-status: HTTP status 503."),
+            std::string::npos)
+      << second->Message();
+}
+
 TEST_F(AttemptsAtOnceTest, WaitingForATurnEndsAtTheDeadline) {
   config.endpoints.resize(1);
   config.retry.attemptsAtOnce = 1;

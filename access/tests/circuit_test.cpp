@@ -106,6 +106,33 @@ TEST_F(CircuitTest, RetryAfterHoldsAClosedCircuit) {
   EXPECT_TRUE(circuit.Admit(now + milliseconds(10500)));
 }
 
+TEST_F(CircuitTest, LaterFailuresDoNotShortenARetryAfter) {
+  for (int i = 0; i < 5; ++i) {
+    ASSERT_TRUE(circuit.Admit(now));
+  }
+  circuit.OnFailure(now, seconds(100), 0.0);
+  for (int i = 0; i < 2; ++i) {
+    circuit.OnFailure(now + seconds(1), milliseconds(0), 0.0);
+    EXPECT_FALSE(circuit.CanAdmit(now + seconds(100))) << i;
+  }
+  EXPECT_EQ(circuit.State(), CircuitState::kOpen);
+  circuit.OnUnclear(now + seconds(1), seconds(10), 0.0);
+  EXPECT_FALSE(circuit.CanAdmit(now + seconds(100)));
+  EXPECT_TRUE(circuit.CanAdmit(now + milliseconds(100500)));
+}
+
+TEST_F(CircuitTest, RetryAfterOfAnAttemptFromBeforeItOpenedCounts) {
+  for (int i = 0; i < 4; ++i) {
+    ASSERT_TRUE(circuit.Admit(now));
+  }
+  for (int i = 0; i < 3; ++i) {
+    circuit.OnFailure(now, milliseconds(0), 0.0);
+  }
+  circuit.OnFailure(now, seconds(100), 0.0);
+  EXPECT_EQ(circuit.State(), CircuitState::kOpen);
+  EXPECT_FALSE(circuit.CanAdmit(now + seconds(100)));
+}
+
 }  // namespace
 
 }  // namespace SsoClient::Access

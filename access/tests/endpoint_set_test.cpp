@@ -136,6 +136,8 @@ TEST_F(EndpointSetTest, AdmissionsAreTheEarliest) {
   FailOnce(1, seconds(20));
   FailOnce(2, seconds(30));
   EXPECT_EQ(*set.NextAdmission(), now + milliseconds(10750));
+  set.OnAnswer(0);
+  FailOnce(0);
   FailOnce(0);
   EXPECT_EQ(*set.NextAdmission(), now + milliseconds(1500));
   EXPECT_EQ(set.EarliestAdmission(), now + milliseconds(1500));

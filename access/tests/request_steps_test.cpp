@@ -242,6 +242,38 @@ TEST_F(RenewalTest, LoginFollowsAtOnceOnlyIfAnEndpointWasReached) {
   EXPECT_EQ(scripts[1]->Seen().back().operation, AttemptOperation::kRenewal);
 }
 
+TEST_F(RenewalTest, LoginWaitsAsLongAsTheAnswerToTheRenewalAskedFor) {
+  config.endpoints.resize(1);
+  Make();
+  Get(spec);
+  runtime->Advance(minutes(20));
+  scripts[0]->Set(
+      [&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+        return request.operation == AttemptOperation::kRenewal ? Unavailable(seconds(2))
+                                                               : issue(request, limit);
+      });
+  CallContext context;
+  context.minimumLife = minutes(50);
+  const auto reply = Ask(spec, context);
+  runtime->Settle();
+  EXPECT_EQ(reply->calls, 0) << reply->Message();
+  runtime->Advance(seconds(4));
+  EXPECT_NE(reply->token, nullptr) << reply->Message();
+  EXPECT_EQ(scripts[0]->Count(), 3U);
+}
+
+TEST_F(RenewalTest, RefreshDoesNotWaitForWhatTheAnswerToTheRenewalAskedFor) {
+  config.endpoints.resize(1);
+  ForAll([&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+    return request.operation == AttemptOperation::kRenewal ? Unavailable(seconds(100))
+                                                           : issue(request, limit);
+  });
+  Make();
+  RefreshOne();
+  ASSERT_EQ(listener->Refreshes().size(), 1U);
+  EXPECT_GE(listener->Refreshes()[0].nextAttempt, seconds(100));
+}
+
 TEST_F(RenewalTest, RefusedRenewalIsNotARefusedLogin) {
   scripts[0]->Set(
       [&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {

@@ -1,5 +1,6 @@
 #include "attempts/exchange_observer.h"
 
+#include <algorithm>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -30,14 +31,18 @@ const ElementNode* FindFault(const ElementNode& envelope) {
   return body == nullptr ? nullptr : body->FirstChildElement("Fault");
 }
 
-// The local name of the fault's code; empty without one.
+// The local name of the fault's code; empty without one. White space around a QName does not count
+// (XML Schema Part 2, section 4.3.6).
 std::string_view FaultCodeOf(const ElementNode& fault) {
+  constexpr std::string_view kWhiteSpace = "\t\n\r ";
   const ElementNode* code = fault.FirstChildElement("faultcode");
   const auto* text = code == nullptr ? nullptr : code->FirstChild();
   if (text == nullptr || text->Kind() != Tarnik::Xml::NodeKind::kText) {
     return {};
   }
-  const std::string_view name = Tarnik::CheckedCast<const Tarnik::Xml::TextNode>(text)->Text();
+  std::string_view name = Tarnik::CheckedCast<const Tarnik::Xml::TextNode>(text)->Text();
+  name = name.substr(0, name.find_last_not_of(kWhiteSpace) + 1);
+  name.remove_prefix(std::min(name.find_first_not_of(kWhiteSpace), name.size()));
   return name.substr(name.find(':') + 1);
 }
 

@@ -260,6 +260,22 @@ TEST_F(AttemptFailureTest, RefusalsWithCodesOfOtherNamespacesAreRefusedLogins) {
   ExpectFailure<ParseException>(AttemptHere(), FailureKind::kRefusedLogin);
 }
 
+TEST_F(AttemptFailureTest, WhiteSpaceAroundACodeDoesNotCount) {
+  const std::string begin =
+      "<e:Envelope xmlns:e='http://schemas.xmlsoap.org/soap/envelope/'><e:Body><e:Fault>"
+      "<faultcode xmlns:f='";
+  const std::string end = "\n</faultcode></e:Fault></e:Body></e:Envelope>";
+  for (const char* code : {"'>\n\tf:FailedAuthentication ", "'>\r\n FailedAuthentication"}) {
+    AnswerWith(DevSts::HttpAnswer{500, "Error", {}, begin + "urn:other" + code + end});
+    const AttemptOutcome outcome = AttemptHere();
+    EXPECT_EQ(outcome.kind, FailureKind::kRefusedLogin);
+    EXPECT_TRUE(outcome.isAuthenticationRefused);
+  }
+  AnswerWith(
+      DevSts::HttpAnswer{500, "Error", {}, begin + kTrust + "'>\n f:InvalidSecurityToken" + end});
+  EXPECT_FALSE(AttemptHere().isAuthenticationRefused);
+}
+
 TEST_F(AttemptFailureTest, ARefusedTokenIsNotARefusedSecret) {
   for (const int status : {200, 403, 500}) {
     AnswerWith(Fault(kTrust, "InvalidSecurityToken", status));

@@ -159,7 +159,7 @@ TEST_F(RefreshAsyncTest, ATokenThatIsNotRenewableIsNotRenewed) {
   EXPECT_THAT(sts_.LastRequest().body, testing::Not(testing::HasSubstr(kRenewType)));
 }
 
-TEST_F(RefreshAsyncTest, WhileAllEndpointsAreDownTheTokenIsServed) {
+TEST_F(RefreshAsyncTest, WhileAllEndpointsAreDownTheTokenIsServedAndRefreshesAreRepeated) {
   Grant(60s);
   DevSts::Server other;
   const auto source = Make(After(0.01, ConfigFor({&sts_, &other})));
@@ -184,6 +184,37 @@ TEST_F(RefreshAsyncTest, WhileAllEndpointsAreDownTheTokenIsServed) {
   const auto failures = source->Metrics().refreshFailures;
   ASSERT_NE(Get(*source, SpecFor(1)).token, nullptr);
   EXPECT_EQ(source->Metrics().refreshFailures, failures);
+}
+
+// Without the answer, the refresh would be repeated after minutes.
+TEST_F(RefreshAsyncTest, TheAnswerToAnotherCallEndsAnOutage) {
+  const std::string heldAudience = "https://stock.example.com";
+  Gate gate;
+  DevSts::ServerOptions options;
+  options.onRequest = [&](const DevSts::ReceivedRequest& request) {
+    if (request.body.find(heldAudience) != std::string::npos) {
+      gate.Pass();
+    }
+  };
+  DevSts::Server sts(options);
+  const auto source = Make(After(0.002, ConfigFor({&sts})));
+  // From then on, two logins may be under way.
+  ASSERT_NE(Get(*source, SpecFor(0)).token, nullptr);
+  TokenCalls held;
+  held.Begin(*source, SpecFor(heldAudience));
+  const bool isHeld = gate.Await(1);
+  const auto token = GetAndAskAgain(*source, spec_);
+  sts.SetMisbehavior(Answering(503, "3600"));
+  const bool hasFailed =
+      listener_->Await([](const Records& seen) { return !seen.refreshFailures.empty(); });
+  EXPECT_EQ(Get(*source, spec_).token, token);
+  sts.ClearMisbehavior();
+  gate.Open();
+  EXPECT_NE(held.Wait().front().token, nullptr);
+  ASSERT_TRUE(isHeld && hasFailed && token != nullptr);
+  EXPECT_GE(listener_->Seen().refreshFailures.front().nextAttempt, 2min);
+  EXPECT_NE(AwaitOther(*source, spec_, *token), nullptr);
+  EXPECT_EQ(source->Metrics().refreshFailures, 1U);
 }
 
 TEST_F(RefreshAsyncTest, ATokenToKeepFreshIsThereBeforeTheFirstCall) {

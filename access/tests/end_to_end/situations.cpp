@@ -9,9 +9,11 @@
 #include <utility>
 
 #include <netinet/in.h>
+#include <netinet/tcp.h>
 #include <sys/socket.h>
 
 #include "end_to_end/silent_resolver.h"
+#include "integration/holder_of_key_fixture.h"
 #include "support/dead_listener.h"
 #include "support/loopback.h"
 
@@ -21,7 +23,7 @@ namespace {
 
 using namespace std::chrono_literals;
 
-constexpr std::size_t kMoreThanSocketsBuffer = std::size_t{2} << 20;
+constexpr std::size_t kMoreThanSocketsBuffer = std::size_t{512} << 10;
 
 TokenSourceConfig PasswordLoginAt(const std::string& url) {
   TokenSourceConfig config = Trusting({});
@@ -102,12 +104,15 @@ class SilentSts : public Situation {
   const bool isTls_;
 };
 
-/// A peer that reads nothing, and whose buffer is small.
+/// A peer that reads nothing, and whose buffer is small. So is that of the sender, since it is in
+/// proportion to the largest segment, which is that of a small network instead of 64 KiB.
 class LargeRequest final : public Situation {
  public:
   LargeRequest() {
-    const int size = 4096;
-    setsockopt(listener_.Get(), SOL_SOCKET, SO_RCVBUF, &size, sizeof size);
+    const int buffer = 4096;
+    setsockopt(listener_.Get(), SOL_SOCKET, SO_RCVBUF, &buffer, sizeof buffer);
+    const int segment = 536;
+    setsockopt(listener_.Get(), IPPROTO_TCP, TCP_MAXSEG, &segment, sizeof segment);
   }
 
   TokenSourceConfig Config() override { return PasswordLoginAt(LoopbackUrl(listener_.Port())); }
@@ -181,6 +186,15 @@ class Turn final : public AnotherCaller {
     config.login = CertificateLogin{};
     config.retry.attemptsAtOnce = 1;
     return config;
+  }
+  // Logins wait for each other until one has been accepted.
+  void Prepare(TokenSource& source) override {
+    sts_.RegisterCertificate(SsoClient::Testing::kMachine,
+                             SsoClient::Testing::Holder().certificatePem);
+    sts_.ClearMisbehavior();
+    EXPECT_NE(Get(source, SpecFor("https://bills.example.com")).token, nullptr);
+    sts_.SetMisbehavior(Stalling(DevSts::Stall::BeforeAnswer));
+    AnotherCaller::Prepare(source);
   }
 };
 
@@ -304,21 +318,23 @@ std::ostream& operator<<(std::ostream& stream, const Stage& stage) {
 
 std::vector<Stage> AllStages() {
   return {
-      {"RequestOfAnother", Makes<AnotherCaller>(SpecFor("https://orders.example.com"))},
-      {"LoginOfAnother", Makes<AnotherCaller>(SpecFor("https://stock.example.com"))},
-      {"Turn", Makes<Turn>()},
-      {"BaseOfAnotherSource", Makes<BaseOfAnotherSource>()},
-      {"LoginFunction", Makes<SlowLoginFunction>()},
-      {"HandlerFunction", Makes<SlowHandlerFunction>()},
-      {"Pause", Makes<PauseBetweenAttempts>()},
-      {"LookUp", Makes<LookUp>()},
-      {"Connect", Makes<UnansweredConnect>()},
-      {"Handshake", Makes<SilentSts>(DevSts::Stall::BeforeTlsHandshake)},
-      {"Writing", Makes<LargeRequest>()},
-      {"Answer", Makes<SilentSts>(DevSts::Stall::BeforeAnswer)},
-      {"AnswerWithoutTls", Makes<SilentSts>(DevSts::Stall::BeforeAnswer, false)},
-      {"Body", Makes<SilentSts>(DevSts::Stall::InMidBody)},
-      {"Drip", Makes<DrippingAnswer>()},
+      {"RequestOfAnother", "the request of another call, which was waiting for the answer of ",
+       Makes<AnotherCaller>(SpecFor("https://orders.example.com"))},
+      {"LoginOfAnother", "the login of another call.",
+       Makes<AnotherCaller>(SpecFor("https://stock.example.com"))},
+      {"Turn", "its turn, since as many attempts as may be are under way.", Makes<Turn>()},
+      {"BaseOfAnotherSource", "the token to exchange.", Makes<BaseOfAnotherSource>()},
+      {"LoginFunction", "the login's function.", Makes<SlowLoginFunction>()},
+      {"HandlerFunction", "the attempt at ", Makes<SlowHandlerFunction>()},
+      {"Pause", "the next attempt. The last attempt had failed: ", Makes<PauseBetweenAttempts>()},
+      {"LookUp", "the look-up of the host of ", Makes<LookUp>()},
+      {"Connect", "the connection to ", Makes<UnansweredConnect>()},
+      {"Handshake", "the TLS handshake with ", Makes<SilentSts>(DevSts::Stall::BeforeTlsHandshake)},
+      {"Writing", "the request to be sent to ", Makes<LargeRequest>()},
+      {"Answer", "the answer of ", Makes<SilentSts>(DevSts::Stall::BeforeAnswer)},
+      {"AnswerWithoutTls", "the answer of ", Makes<SilentSts>(DevSts::Stall::BeforeAnswer, false)},
+      {"Body", "the rest of the answer of ", Makes<SilentSts>(DevSts::Stall::InMidBody)},
+      {"Drip", "the rest of the answer of ", Makes<DrippingAnswer>()},
   };
 }
 

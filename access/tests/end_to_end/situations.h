@@ -27,6 +27,7 @@ class Situation {
 
 struct Stage {
   const char* name;
+  const char* waitingFor;  ///< as the message of a deadline says it, without the URL
   std::function<std::unique_ptr<Situation>()> make;
 };
 

@@ -16,6 +16,7 @@ namespace {
 using namespace std::chrono_literals;
 using Clock = std::chrono::steady_clock;
 
+constexpr std::chrono::milliseconds kDeadline{200};
 // A password whose verdict is not known yet is not abandoned with its callers.
 constexpr std::chrono::milliseconds kAttempt{1000};
 
@@ -34,24 +35,32 @@ class StageAsyncTest : public testing::TestWithParam<Stage> {
 };
 
 TEST_P(StageAsyncTest, ACallEndsAtItsDeadline) {
-  const auto late = BestOf([](Situation& situation) {
+  const std::string expected =
+      std::string("The deadline passed while the call was waiting for ") + GetParam().waitingFor;
+  std::string message;
+  auto limit = kDeadline;
+  const auto late = BestOf([&](Situation& situation) {
     const auto listener = std::make_shared<AwaitingListener>();
     TokenSourceConfig config = situation.Config();
     config.listener = listener;
-    config.retry.attemptTimeout = kAttempt;
+    config.retry.attemptTimeout = kAttempt / kDeadline * limit;
     const auto source = CreateTokenSource(config);
     situation.Prepare(*source);
     const TokenSpec spec = situation.Spec();
-    const CallContext context = CallContext::Within(200ms);
+    const CallContext context = CallContext::Within(limit);
     const Result result = Get(*source, spec, context);
     EXPECT_TRUE(result.Is<CommunicationException>()) << result.type;
-    EXPECT_THAT(result.message,
-                testing::StartsWith("The deadline passed while the call was waiting for "));
     EXPECT_GE(result.ended, context.deadline);
     EXPECT_TRUE(situation.AwaitNothingLeft());
-    return result.ended - context.deadline;
+    message = result.message;
+    if (message.compare(0, expected.size(), expected) == 0) {
+      return result.ended - context.deadline;
+    }
+    // A slow machine may need longer to get to the stage.
+    limit *= 2;
+    return Clock::duration::max();
   });
-  EXPECT_LT(late, kPromptly);
+  EXPECT_LT(late, kPromptly) << message;
 }
 
 TEST_P(StageAsyncTest, ACallEndsWhenItIsCancelled) {

@@ -61,8 +61,9 @@ struct RetryConfig {
   int attemptsAtOnce = 64;
   /// The limit of one attempt, from the look-up of the host to the last byte of the answer (of the
   /// last leg, for a negotiation). At most 240 seconds, the limit of the client. A refresh takes at
-  /// most half of the time for which the token is still handed out, but at least a second.
-  std::chrono::milliseconds attemptTimeout{std::chrono::seconds{10}};
+  /// most half of the time for which the token is still handed out, but at least a second. The
+  /// default leaves callers that wait for ten seconds time to ask another endpoint.
+  std::chrono::milliseconds attemptTimeout{std::chrono::seconds{8}};
   /// The pause before round n is random between half of and all of `firstDelay` * 2^(n-2), limited
   /// to `longestDelay`; both are positive. The pauses between the refreshes of a key while they
   /// fail, and between the probes of an endpoint, grow in the same way; the background requests for
