@@ -32,13 +32,6 @@ Secret FetchSecret(const PasswordLogin& login, Failure& failure) {
   return Secret{};
 }
 
-bool IsSameCertificate(const Tarnik::Crypto::Certificate& a, const Tarnik::Crypto::Certificate& b) {
-  const auto bytes = [](const Tarnik::Crypto::Certificate& certificate) {
-    return std::basic_string_view(certificate.DerBytes(), certificate.DerLength());
-  };
-  return bytes(a) == bytes(b);
-}
-
 void Normalise(AttemptOutcome& outcome) {
   if (outcome.token != nullptr || outcome.failure != nullptr) {
     return;
