@@ -102,4 +102,19 @@ const char* NameOf(Reason reason) noexcept {
   return "unknown";
 }
 
+Remedy RemedyOf(Reason reason) noexcept {
+  switch (reason) {
+    case Reason::kNone:
+      return Remedy::kNone;
+    case Reason::kNotInGroup:
+    case Reason::kRefusedByPredicate:
+      return Remedy::kAccess;
+    case Reason::kRevocationUnknown:
+    case Reason::kPredicateFailed:
+      return Remedy::kService;
+    default:
+      return Remedy::kNewToken;
+  }
+}
+
 }  // namespace SsoClient::Access

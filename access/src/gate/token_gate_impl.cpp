@@ -1,49 +1,22 @@
 #include "gate/token_gate_impl.h"
 
-#include <memory>
 #include <utility>
 
-#include "gate/checked_tokens.h"
 #include "gate/gate_config_check.h"
-#include "gate/gate_counters.h"
 #include "gate/token_presentation.h"
-#include "process_hooks.h"
 
 namespace SsoClient::Access {
-
-struct TokenGateImpl::Process {
-  Process(std::uint64_t ownGeneration, const GateCacheConfig& cache)
-      : generation(ownGeneration), tokens(cache) {}
-
-  GateCounters counters;
-  std::uint64_t generation;
-  CheckedTokens tokens;
-};
 
 TokenGate::~TokenGate() = default;
 
 TokenGateImpl::TokenGateImpl(GateConfig config)
     : config_(std::make_shared<const GateConfig>(std::move(config))),
-      trust_(std::dynamic_pointer_cast<const TrustStoreImpl>(config_->trust)),
-      process_(new Process(ForkGeneration(), config_->cache)) {}
-
-TokenGateImpl::~TokenGateImpl() {
-  Process* const last = process_.load(std::memory_order_acquire);
-  if (last->generation == ForkGeneration()) {
-    delete last;
-  }
+      trust_(std::dynamic_pointer_cast<const TrustStoreImpl>(config_->trust)) {
+  Current();
 }
 
 TokenGateImpl::Process& TokenGateImpl::Current() const {
-  Process* known = process_.load(std::memory_order_acquire);
-  if (known->generation == ForkGeneration()) {
-    return *known;
-  }
-  auto made = std::make_unique<Process>(ForkGeneration(), config_->cache);
-  if (process_.compare_exchange_strong(known, made.get(), std::memory_order_acq_rel)) {
-    return *made.release();
-  }
-  return *known;
+  return process_.Get([this] { return Process(config_->cache); });
 }
 
 Tarnik::System::DateTime TokenGateImpl::Now() const {
