@@ -67,8 +67,8 @@ std::string SignerKnownText(const VerdictFacts& facts) {
     return "issuer " + ShownText(name);
   }
   const Signers signers = SelectSigners(*checked.trust, *checked.token);
-  return "issuer " + ShownText(name) + ", for which " + std::to_string(issuer->signers.size()) +
-         " are trusted; of these, the token names " +
+  return "issuer " + ShownText(name) + "; of " + std::to_string(issuer->signers.size()) +
+         " that may sign for it, the token names " +
          (signers.empty() ? std::string("none") : NamesOf(signers));
 }
 
