@@ -5,6 +5,7 @@
 #include <variant>
 
 #include <ssoclient/exceptions.h>
+#include <tarnik/crypto/certificate.h>
 #include <tarnik/text/string_util.h>
 
 #include "core.h"
@@ -30,13 +31,6 @@ Secret FetchSecret(const PasswordLogin& login, Failure& failure) {
     failure = Failure::Current();
   }
   return Secret{};
-}
-
-bool IsSameCertificate(const Tarnik::Crypto::Certificate& a, const Tarnik::Crypto::Certificate& b) {
-  const auto bytes = [](const Tarnik::Crypto::Certificate& certificate) {
-    return std::basic_string_view(certificate.DerBytes(), certificate.DerLength());
-  };
-  return bytes(a) == bytes(b);
 }
 
 void Normalise(AttemptOutcome& outcome) {
@@ -142,7 +136,7 @@ bool Core::IsRenewable(const SamlToken& token) const {
   }
   const auto certificate = token.HolderOfKeyCertificate();
   return certificate != nullptr &&
-         IsSameCertificate(*certificate, *config_->holderOfKey->certificate);
+         Tarnik::Crypto::IsSameCertificate(*certificate, *config_->holderOfKey->certificate);
 }
 
 // A token ends with the one that it is exchanged for, which must last for those who wait.

@@ -6,6 +6,7 @@
 
 #include <ssoclient/access/trust_store.h>
 
+#include "runtime.h"
 #include "trust/trust_snapshot.h"
 
 namespace SsoClient::Access {
@@ -18,6 +19,10 @@ class TrustStoreImpl : public TrustStore {
   /// The version of the trust in use, without a lock.
   virtual std::uint64_t Version() const noexcept = 0;
 };
+
+/// The public function, with a runtime.
+std::shared_ptr<TrustStoreImpl> CreateTrustStore(TrustStoreConfig config,
+                                                 std::shared_ptr<Runtime> runtime);
 
 }  // namespace SsoClient::Access
 

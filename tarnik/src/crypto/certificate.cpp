@@ -1,6 +1,7 @@
 #include <chrono>
 #include <climits>
 #include <ctime>
+#include <mutex>
 #include <utility>
 
 #include <openssl/pem.h>
@@ -12,6 +13,7 @@
 #include "crypto/load_file.h"
 #include "crypto/pem.h"
 #include "crypto/public_key_impl.h"
+#include "support/object_lock.h"
 #include "support/openssl.h"
 #include "support/openssl_error.h"
 
@@ -132,6 +134,10 @@ std::vector<unsigned char> PublicKeyInfo(X509* certificate) {
   return {bytes, bytes + length};
 }
 
+std::string_view EncodingOf(const Certificate& certificate) noexcept {
+  return {reinterpret_cast<const char*>(certificate.DerBytes()), certificate.DerLength()};
+}
+
 }  // namespace
 
 CertificateImpl::CertificateImpl(std::vector<unsigned char> der, X509* decoded)
@@ -156,6 +162,19 @@ Ref<const PublicKey> CertificateImpl::GetPublicKey() const {
     throw CryptoException("The certificate's public key is broken or of an unknown kind.");
   }
   return publicKey_;
+}
+
+Sha256Digest CertificateImpl::Fingerprint() const {
+  if (hasFingerprint_.load(std::memory_order_acquire)) {
+    return fingerprint_;
+  }
+  const Sha256Digest computed = Sha256(EncodingOf(*this));
+  const std::lock_guard lock(ObjectLock(this));
+  if (!hasFingerprint_.load(std::memory_order_relaxed)) {
+    fingerprint_ = computed;
+    hasFingerprint_.store(true, std::memory_order_release);
+  }
+  return computed;
 }
 
 std::string CertificateImpl::ToString() const {
@@ -201,6 +220,44 @@ std::vector<Ref<const Certificate>> LoadCertificates(const std::string& path) {
                   [](std::string_view pem, const PassphraseCallback& /*passphrase*/) {
                     return CreateCertificatesFromPem(pem);
                   });
+}
+
+std::vector<Ref<const Certificate>> CreateCertificatesFromPemOrDer(std::string_view content) {
+  if (!StartsLikeDer(content)) {
+    return CreateCertificatesFromPem(content);
+  }
+  const auto* bytes = reinterpret_cast<const unsigned char*>(content.data());
+  return {CreateCertificateFromDer(bytes, content.size())};
+}
+
+std::vector<Ref<const Certificate>> LoadPemOrDerCertificates(const std::string& path) {
+  return LoadFile("certificate", path, {},
+                  [](std::string_view content, const PassphraseCallback& /*passphrase*/) {
+                    return CreateCertificatesFromPemOrDer(content);
+                  });
+}
+
+bool IsSameCertificate(const Certificate& a, const Certificate& b) noexcept {
+  return a.DerLength() == b.DerLength() &&
+         IsEqualInConstantTime(a.DerBytes(), b.DerBytes(), a.DerLength());
+}
+
+Sha256Digest Fingerprint(const Certificate& certificate) {
+  const auto* decoded = dynamic_cast<const CertificateImpl*>(&certificate);
+  return decoded == nullptr ? Sha256(EncodingOf(certificate)) : decoded->Fingerprint();
+}
+
+std::string FingerprintText(const Certificate& certificate) {
+  constexpr const char* kDigits = "0123456789ABCDEF";
+  std::string text;
+  for (const unsigned char byte : Fingerprint(certificate)) {
+    if (!text.empty()) {
+      text += ':';
+    }
+    text += kDigits[byte >> 4];
+    text += kDigits[byte & 0xF];
+  }
+  return text;
 }
 
 }  // namespace Tarnik::Crypto

@@ -1,6 +1,7 @@
 #ifndef TARNIK_CRYPTO_CERTIFICATE_IMPL_H
 #define TARNIK_CRYPTO_CERTIFICATE_IMPL_H
 
+#include <atomic>
 #include <cstddef>
 #include <string>
 #include <vector>
@@ -44,6 +45,8 @@ class CertificateImpl final : public Certificate, public ObjectImpl {
   const std::vector<unsigned char>& KeyIdentifier() const noexcept {
     return subjectKeyIdentifier_.empty() ? computedKeyIdentifier_ : subjectKeyIdentifier_;
   }
+  /// See `Crypto::Fingerprint`.
+  Sha256Digest Fingerprint() const;
 
  private:
   std::vector<unsigned char> der_;
@@ -58,6 +61,9 @@ class CertificateImpl final : public Certificate, public ObjectImpl {
   std::vector<unsigned char> computedKeyIdentifier_;
   std::vector<unsigned char> keyInfo_;
   Ref<const PublicKey> publicKey_;  // null when OpenSSL does not know the kind of key
+  // Written under `ObjectLock(this)`, and only before the flag is set.
+  mutable Sha256Digest fingerprint_{};
+  mutable std::atomic<bool> hasFingerprint_{false};
 };
 
 }  // namespace Tarnik::Crypto

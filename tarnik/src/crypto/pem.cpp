@@ -39,12 +39,15 @@ PemBlock::~PemBlock() {
   Release(bytes_, capacity_);
 }
 
-const char* DescribeMissingPem(std::string_view text) noexcept {
-  // Certificates, keys and revocation lists are sequences.
+bool StartsLikeDer(std::string_view content) noexcept {
+  // A sequence with a length of several bytes. In UTF-8, such a byte follows no digit.
   constexpr char kSequence = '\x30';
-  const bool isDer = text.size() > 1 && text.front() == kSequence &&
-                     (static_cast<unsigned char>(text[1]) & 0x80) != 0;
-  return isDer ? ": it is DER." : ".";
+  return content.size() > 1 && content.front() == kSequence &&
+         (static_cast<unsigned char>(content[1]) & 0xC0) == 0x80;
+}
+
+const char* DescribeMissingPem(std::string_view text) noexcept {
+  return StartsLikeDer(text) ? ": it is DER." : ".";
 }
 
 PemReader::PemReader(std::string_view pem) {

@@ -36,7 +36,11 @@ class PemBlock {
   std::size_t capacity_ = 0;
 };
 
-/// ": it is DER" when `text`, in which no block was found, starts like DER (X.690, section 8.1), or
+/// True for the first bytes of a certificate, key or revocation list in DER (X.690, section 8.1),
+/// which are not those of a text in UTF-8.
+bool StartsLikeDer(std::string_view content) noexcept;
+
+/// ": it is DER" when `text`, in which no block was found, starts like DER, or
 /// nothing; then a full stop. The end of a message.
 const char* DescribeMissingPem(std::string_view text) noexcept;
 

@@ -2,6 +2,7 @@
 #include <cstddef>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include <gmock/gmock.h>
@@ -10,8 +11,10 @@
 #include <openssl/pem.h>
 
 #include <tarnik/core/exception.h>
+#include <tarnik/core/object_impl.h>
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/crypto/digest.h>
 
 #include "crypto/certificate_impl.h"
 #include "support/openssl.h"
@@ -245,6 +248,116 @@ TEST(LoadCertificatesTest, NamesTheFileThatCannotBeRead) {
 TEST(LoadCertificatesTest, RefusesADirectory) {
   EXPECT_THAT(ThrownMessage<IOException>([] { LoadCertificates("/"); }),
               HasSubstr("Is a directory"));
+}
+
+TEST(PemOrDerCertificatesTest, AreReadFromBothForms) {
+  const auto der = MakeCertificateDer({.commonName = "in either form"});
+  const std::string pem = ToPem(MakeCertificateDer({.commonName = "first"})) + ToPem(der);
+  const TemporaryFile pemFile("0 is where this text starts.\n" + pem);
+  const TemporaryFile derFile({der.begin(), der.end()});
+  ASSERT_EQ(LoadPemOrDerCertificates(pemFile.Path()).size(), 2U);
+  ASSERT_EQ(LoadPemOrDerCertificates(derFile.Path()).size(), 1U);
+  EXPECT_EQ(LoadPemOrDerCertificates(pemFile.Path())[1],
+            LoadPemOrDerCertificates(derFile.Path())[0]);
+}
+
+// Each reader finds the same certificates in a file, whatever else it contains.
+TEST(PemOrDerCertificatesTest, AreNotReadFromAPemTextWithinDer) {
+  const auto der = MakeCertificateDer(
+      {.commonName = "outer", .comment = "\n" + ToPem(MakeCertificateDer()) + "\n"});
+  const auto read =
+      CreateCertificatesFromPemOrDer({reinterpret_cast<const char*>(der.data()), der.size()});
+  ASSERT_EQ(read.size(), 1U);
+  EXPECT_EQ(read[0]->SubjectName(), "CN=outer,O=Test\\, Inc.");
+}
+
+TEST(PemOrDerCertificatesTest, AreRefusedWithTheNameOfTheFile) {
+  const auto der = MakeCertificateDer();
+  const TemporaryFile half(std::string(der.begin(), der.begin() + 100));
+  EXPECT_THAT(ThrownMessage<CryptoException>([&] { LoadPemOrDerCertificates(half.Path()); }),
+              StartsWith("The certificate file '" + half.Path() +
+                         "' cannot be used: The certificate cannot be decoded: "));
+  const TemporaryFile text("0\xC3\xA9");
+  EXPECT_EQ(ThrownMessage<CryptoException>([&] { LoadPemOrDerCertificates(text.Path()); }),
+            "The certificate file '" + text.Path() +
+                "' cannot be used: The PEM text holds no certificate.");
+  EXPECT_THAT(ThrownMessage<IOException>([] { LoadPemOrDerCertificates("/nonexistent/a.cer"); }),
+              HasSubstr("/nonexistent/a.cer"));
+}
+
+/// A certificate of a caller's own class.
+class CallersCertificate final : public Certificate, public ObjectImpl {
+ public:
+  explicit CallersCertificate(std::vector<unsigned char> der) : der_(std::move(der)) {}
+
+  const unsigned char* DerBytes() const noexcept override { return der_.data(); }
+  std::size_t DerLength() const noexcept override { return der_.size(); }
+  const std::string& SubjectName() const override { return text_; }
+  const std::string& IssuerName() const override { return text_; }
+  const std::string& SerialNumber() const override { return text_; }
+  System::DateTime NotBefore() const override { return {}; }
+  System::DateTime NotAfter() const override { return {}; }
+  const std::vector<unsigned char>& SubjectKeyIdentifier() const override { return der_; }
+  Ref<const PublicKey> GetPublicKey() const override { return nullptr; }
+
+ private:
+  std::vector<unsigned char> der_;
+  std::string text_;
+};
+
+TEST(CertificateIdentityTest, IsThatOfTheBytes) {
+  const auto der = MakeCertificateDer({.commonName = "same"});
+  const auto certificate = CreateCertificateFromDer(der.data(), der.size());
+  EXPECT_TRUE(IsSameCertificate(*certificate, *certificate));
+  EXPECT_TRUE(IsSameCertificate(*certificate, CallersCertificate(der)));
+  EXPECT_TRUE(IsSameCertificate(CallersCertificate({}), CallersCertificate({})));
+}
+
+// Two certificates of one key, subject, issuer and serial number may differ only in their last bit.
+TEST(CertificateIdentityTest, CoversEveryByte) {
+  const auto der = MakeCertificateDer();
+  const CallersCertificate certificate(der);
+  for (std::size_t i = 0; i < der.size(); ++i) {
+    auto other = der;
+    other[i] ^= 1;
+    ASSERT_FALSE(IsSameCertificate(certificate, CallersCertificate(other))) << i;
+    ASSERT_NE(Fingerprint(certificate), Fingerprint(CallersCertificate(other))) << i;
+  }
+  const CallersCertificate shorter({der.begin(), der.end() - 1});
+  EXPECT_FALSE(IsSameCertificate(certificate, shorter));
+  EXPECT_FALSE(IsSameCertificate(shorter, certificate));
+}
+
+TEST(CertificateIdentityTest, HasAFingerprintOfTheBytes) {
+  const auto der = MakeCertificateDer({.commonName = "fingerprint"});
+  const auto certificate = CreateCertificateFromDer(der.data(), der.size());
+  const Sha256Digest expected = Sha256({reinterpret_cast<const char*>(der.data()), der.size()});
+  EXPECT_EQ(Fingerprint(*certificate), expected);
+  EXPECT_EQ(Fingerprint(*certificate), expected);  // remembered
+  EXPECT_EQ(Fingerprint(CallersCertificate(der)), expected);
+}
+
+// As `openssl x509 -fingerprint -sha256` prints it.
+TEST(CertificateIdentityTest, HasAFingerprintTextInTheUsualForm) {
+  EXPECT_EQ(
+      FingerprintText(CallersCertificate({'a', 'b', 'c'})),
+      "BA:78:16:BF:8F:01:CF:EA:41:41:40:DE:5D:AE:22:23:B0:03:61:A3:96:17:7A:9C:B4:10:FF:61:F2:"
+      "00:15:AD");
+}
+
+TEST(CertificateIdentityTest, HasAFingerprintForManyThreadsAtOnce) {
+  const auto certificate = MakeCertificate({.commonName = "fingerprint of threads"});
+  const Sha256Digest expected =
+      Sha256({reinterpret_cast<const char*>(certificate->DerBytes()), certificate->DerLength()});
+  std::atomic<int> wrong{0};
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 4; ++t) {
+    threads.emplace_back([&] { wrong += Fingerprint(*certificate) == expected ? 0 : 1; });
+  }
+  for (std::thread& thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(wrong, 0);
 }
 
 TEST(CertificateTest, MayBeCreatedByManyThreadsAtOnce) {

@@ -67,8 +67,8 @@ struct TrustDescription {
 
 /// Changed files have been read, or could not be.
 struct TrustRecord {
-  std::string store{};    ///< `TrustStoreConfig::name`
-  std::string failure{};  ///< why the trust stays as it was; empty if it has been replaced
+  std::string store{};      ///< `TrustStoreConfig::name`
+  std::string failure{};    ///< why the trust stays as it was; empty if it has been replaced
   std::size_t added = 0;    ///< certificates, by their SHA-256
   std::size_t removed = 0;  ///< certificates, by their SHA-256
   std::size_t signers = 0;  ///< certificates in use now

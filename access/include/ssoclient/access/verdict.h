@@ -33,29 +33,29 @@ enum class CheckOutcome { kPassed, kFailed, kNotReached };
 
 /// Why a token was refused, for programs. Later versions may add some.
 enum class Reason {
-  kNone,                  ///< it was not refused
-  kTooLarge,              ///< its text is longer than `GateConfig::largestToken`
-  kNotWellFormed,         ///< its text is not XML that is accepted
-  kBadLayout,             ///< it is not an assertion of the accepted structure
-  kNotYetValid,           ///< NotBefore is in the future
-  kExpired,               ///< NotOnOrAfter has passed
-  kUnknownIssuer,         ///< nobody is trusted to sign tokens of its issuer
-  kUnknownSigner,         ///< it names no certificate that is trusted for its issuer
-  kSignerNotYetValid,     ///< the validity of its signer's certificate has not begun
-  kSignerExpired,         ///< the validity of its signer's certificate has ended
-  kSignerRevoked,         ///< its signer's certificate is on a revocation list
-  kRevocationUnknown,     ///< no current list covers its signer's certificate, but one must
-  kBadSignature,          ///< its signature does not verify with its signer's key
-  kWrongAudience,         ///< it is restricted to other audiences
-  kUnrestricted,          ///< it is not restricted to audiences, but must be
-  kBearerRefused,         ///< it is a bearer token, which the gate refuses
-  kNoProof,               ///< its key was not proved, since the presenter is `Presenter::Nobody`
-  kWrongProof,            ///< the presenter proved another key, or nothing
-  kTooLongLived,          ///< its lifetime is longer than `GateConfig::longestLifetime`
-  kTooDeeplyDelegated,    ///< it has more delegates than `GateConfig::deepestDelegation`
-  kNotInGroup,            ///< its subject is in none of `GateConfig::allowedGroups`
-  kRefusedByPredicate,    ///< `GateConfig::predicate` returned false
-  kPredicateFailed,       ///< `GateConfig::predicate` threw
+  kNone,                ///< it was not refused
+  kTooLarge,            ///< its text is longer than `GateConfig::largestToken`
+  kNotWellFormed,       ///< its text is not XML that is accepted
+  kBadLayout,           ///< it is not an assertion of the accepted structure
+  kNotYetValid,         ///< NotBefore is in the future
+  kExpired,             ///< NotOnOrAfter has passed
+  kUnknownIssuer,       ///< nobody is trusted to sign tokens of its issuer
+  kUnknownSigner,       ///< it names no certificate that is trusted for its issuer
+  kSignerNotYetValid,   ///< the validity of its signer's certificate has not begun
+  kSignerExpired,       ///< the validity of its signer's certificate has ended
+  kSignerRevoked,       ///< its signer's certificate is on a revocation list
+  kRevocationUnknown,   ///< no current list covers its signer's certificate, but one must
+  kBadSignature,        ///< its signature does not verify with its signer's key
+  kWrongAudience,       ///< it is restricted to other audiences
+  kUnrestricted,        ///< it is not restricted to audiences, but must be
+  kBearerRefused,       ///< it is a bearer token, which the gate refuses
+  kNoProof,             ///< its key was not proved, since the presenter is `Presenter::Nobody`
+  kWrongProof,          ///< the presenter proved another key, or nothing
+  kTooLongLived,        ///< its lifetime is longer than `GateConfig::longestLifetime`
+  kTooDeeplyDelegated,  ///< it has more delegates than `GateConfig::deepestDelegation`
+  kNotInGroup,          ///< its subject is in none of `GateConfig::allowedGroups`
+  kRefusedByPredicate,  ///< `GateConfig::predicate` returned false
+  kPredicateFailed,     ///< `GateConfig::predicate` threw
 };
 
 /// Who can do something about a refusal.
@@ -99,8 +99,8 @@ class SSOCLIENT_ACCESS_EXPORT Verdict {
   /// `Reason::kNone` for an accepted token.
   Reason Refusal() const noexcept;
   /// Why the token was refused, in one line for people, with the rules of `CheckRecord::compared`,
-  /// and without the name of the reason; empty for an accepted token. It says which audiences and signers this service knows: for its log, not for
-  /// its answer to the presenter.
+  /// and without the name of the reason; empty for an accepted token. It says which audiences and
+  /// signers this service knows: for its log, not for its answer to the presenter.
   const std::string& Message() const noexcept;
   /// A record for each `CheckKind`, in order. The texts are made by this call.
   std::vector<CheckRecord> Ledger() const;

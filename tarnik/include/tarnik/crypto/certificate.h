@@ -43,9 +43,8 @@ TARNIK_EXPORT std::vector<Ref<const Certificate>> CreateCertificatesFromPem(std:
 /// Reads a file of PEM certificates. Throws `IOException` when it cannot be read, and otherwise as
 /// above.
 TARNIK_EXPORT std::vector<Ref<const Certificate>> LoadCertificates(const std::string& path);
-/// Reads the content of a certificate file in either usual form: every CERTIFICATE block of a PEM
-/// text, in order, or, if there is no block of any label, one certificate in DER. Throws
-/// `CryptoException` when it is neither.
+/// Reads the content of a certificate file in either usual form: one certificate in DER, or a PEM
+/// text as above. Throws as these do.
 TARNIK_EXPORT std::vector<Ref<const Certificate>> CreateCertificatesFromPemOrDer(
     std::string_view content);
 /// Reads a file of either form. Throws `IOException` when it cannot be read, and otherwise as

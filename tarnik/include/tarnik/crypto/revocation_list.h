@@ -56,8 +56,7 @@ TARNIK_EXPORT Ref<const RevocationList> CreateRevocationListFromDer(const unsign
 /// skipped. Throws `CryptoException` when it contains no list or one cannot be decoded or used.
 TARNIK_EXPORT std::vector<Ref<const RevocationList>> CreateRevocationListsFromPem(
     std::string_view pem);
-/// Reads the content of a file in either usual form: as above or, if there is no PEM block of any
-/// label, one list in DER.
+/// Reads the content of a file in either usual form: one list in DER, or a PEM text as above.
 TARNIK_EXPORT std::vector<Ref<const RevocationList>> CreateRevocationListsFromPemOrDer(
     std::string_view content);
 /// Reads a file of either form. Throws `IOException` when it cannot be read, and otherwise as

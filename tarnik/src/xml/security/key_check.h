@@ -8,10 +8,6 @@
 
 namespace Tarnik::Xml::Security {
 
-/// True for a key of the scheme's type.
-bool IsOfType(const Crypto::PublicKeyImpl& key, Crypto::SignatureScheme scheme) noexcept;
-/// True for a key that `CheckTrustedKey` accepts.
-bool IsUsableKey(const Crypto::PublicKeyImpl& key, Crypto::SignatureScheme scheme) noexcept;
 /// Throws `XmlSecurityException` unless the key is of the scheme's type and, for RSA, has at least
 /// 2048 bits or, for EC, is on P-256, P-384 or P-521.
 void CheckTrustedKey(const Crypto::PublicKeyImpl& key, Crypto::SignatureScheme scheme);

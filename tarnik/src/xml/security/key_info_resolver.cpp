@@ -15,7 +15,7 @@ Ref<const Crypto::PublicKey> OnlyOneOf(const Keys& keys) {
   return keys.size() == 1 ? keys.front() : nullptr;
 }
 
-class TrustedCertificatesResolver final : public KeyCandidatesResolver, public ObjectImpl {
+class TrustedCertificatesResolver final : public CertificateCandidatesResolver, public ObjectImpl {
  public:
   explicit TrustedCertificatesResolver(CertificateList trusted) : trusted_(std::move(trusted)) {}
 
@@ -23,6 +23,9 @@ class TrustedCertificatesResolver final : public KeyCandidatesResolver, public O
     return OnlyOneOf(trusted_.NamedBy(keyInfo));
   }
   Keys Candidates(const KeyInfo& keyInfo) const override { return trusted_.NamedBy(keyInfo); }
+  CertificateList CandidateCertificates(const KeyInfo& keyInfo) const override {
+    return trusted_.CertificatesNamedBy(keyInfo);
+  }
 
  private:
   const TrustedCertificates trusted_;

@@ -6,6 +6,7 @@
 
 #include <tarnik/xml/security/xml_security_exception.h>
 
+#include "crypto/key_rules.h"
 #include "xml/security/key_check.h"
 #include "xml/security/signer_description.h"
 
@@ -48,7 +49,7 @@ Ref<const PublicKeyImpl> ImplementationOf(const Ref<const PublicKey>& key) {
 [[noreturn]] void RefuseUnusable(const KeyList& keys, SignatureScheme scheme) {
   for (const Ref<const PublicKey>& key : keys) {
     const auto* implementation = dynamic_cast<const PublicKeyImpl*>(key.get());
-    if (implementation != nullptr && IsOfType(*implementation, scheme)) {
+    if (implementation != nullptr && Crypto::IsOfType(*implementation, scheme)) {
       CheckTrustedKey(*implementation, scheme);
     }
   }
@@ -60,7 +61,7 @@ KeySelection SelectUsable(const KeyList& candidates, SignatureScheme scheme) {
   selection.isChoice = true;
   for (const Ref<const PublicKey>& candidate : candidates) {
     const auto* key = dynamic_cast<const PublicKeyImpl*>(candidate.get());
-    if (key == nullptr || !IsUsableKey(*key, scheme)) {
+    if (key == nullptr || !Crypto::IsUsableKey(*key, scheme)) {
       continue;
     }
     if (selection.keys.size() == kMaxKeysTried) {

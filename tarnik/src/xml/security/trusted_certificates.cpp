@@ -181,29 +181,50 @@ void TrustedCertificates::CollectKeys() {
 }
 
 TrustedCertificates::Keys TrustedCertificates::NamedBy(const KeyInfo& keyInfo) const {
-  if (!keyInfo.certificates.empty()) {
-    return KeysOf(SelectByCertificates(keyInfo.certificates));
-  }
-  if (!keyInfo.issuerSerials.empty()) {
-    return KeysOf(SelectByIssuerSerials(keyInfo.issuerSerials));
-  }
-  if (!keyInfo.subjectKeyIdentifiers.empty()) {
-    return KeysOf(SelectByKeyIdentifiers(keyInfo.subjectKeyIdentifiers));
-  }
-  if (!keyInfo.subjectNames.empty()) {
-    return KeysOf(SelectBySubjectNames(keyInfo.subjectNames));
-  }
-  if (list_.size() == 1) {
-    return KeysOf({&list_.front()});
-  }
-  return NamedByKeyHints(ReadKeyHints(keyInfo));
+  return KeysOf(SelectBy(keyInfo));
 }
 
-TrustedCertificates::Keys TrustedCertificates::NamedByKeyHints(const KeyHints& hints) const {
-  if (!SupportedDigestsIn(hints).empty()) {
-    return KeysOf(SelectByDigests(hints));
+TrustedCertificates::CertificateList TrustedCertificates::CertificatesNamedBy(
+    const KeyInfo& keyInfo) const {
+  const Selection selection = SelectBy(keyInfo);
+  if (selection.size() == 1) {
+    static_cast<void>(selection.front()->certificate->GetPublicKey());  // throws if it is not known
+    return {selection.front()->certificate};
   }
-  return hints.publicKeys.empty() ? keys_ : KeysOf(SelectByPublicKeys(hints.publicKeys));
+  CertificateList certificates;
+  for (const Trusted* trusted : selection) {
+    if (trusted->key != kNoKey) {
+      certificates.push_back(trusted->certificate);
+    }
+  }
+  return certificates;
+}
+
+TrustedCertificates::Selection TrustedCertificates::SelectBy(const KeyInfo& keyInfo) const {
+  if (!keyInfo.certificates.empty()) {
+    return SelectByCertificates(keyInfo.certificates);
+  }
+  if (!keyInfo.issuerSerials.empty()) {
+    return SelectByIssuerSerials(keyInfo.issuerSerials);
+  }
+  if (!keyInfo.subjectKeyIdentifiers.empty()) {
+    return SelectByKeyIdentifiers(keyInfo.subjectKeyIdentifiers);
+  }
+  if (!keyInfo.subjectNames.empty()) {
+    return SelectBySubjectNames(keyInfo.subjectNames);
+  }
+  if (list_.size() == 1) {
+    return {&list_.front()};
+  }
+  return SelectByKeyHints(ReadKeyHints(keyInfo));
+}
+
+TrustedCertificates::Selection TrustedCertificates::SelectByKeyHints(const KeyHints& hints) const {
+  if (!SupportedDigestsIn(hints).empty()) {
+    return SelectByDigests(hints);
+  }
+  return hints.publicKeys.empty() ? Select([](const Trusted&) { return true; })
+                                  : SelectByPublicKeys(hints.publicKeys);
 }
 
 TrustedCertificates::Keys TrustedCertificates::NamedByIssuer(const KeyInfo& keyInfo) const {

@@ -31,8 +31,10 @@ class TrustedCertificates {
   /// present, in the order of the list: see `CreateTrustedCertificatesResolver`. Throws
   /// `CryptoException` when it names a single certificate whose key cannot be used.
   Keys NamedBy(const KeyInfo& keyInfo) const;
-  /// As above, but only by issuer and serial number. If `keyInfo` has no such hint, uses those of
-  /// its first certificate.
+  /// The certificates of these keys that `keyInfo` names. Throws as above.
+  CertificateList CertificatesNamedBy(const KeyInfo& keyInfo) const;
+  /// As `NamedBy`, but only by issuer and serial number. If `keyInfo` has no such hint, uses those
+  /// of its first certificate.
   Keys NamedByIssuer(const KeyInfo& keyInfo) const;
 
  private:
@@ -47,7 +49,8 @@ class TrustedCertificates {
   using Selection = std::vector<const Trusted*>;
 
   void CollectKeys();
-  Keys NamedByKeyHints(const KeyHints& hints) const;
+  Selection SelectBy(const KeyInfo& keyInfo) const;
+  Selection SelectByKeyHints(const KeyHints& hints) const;
   template <class Matches>
   Selection Select(Matches matches) const;
   Selection SelectByCertificates(const std::vector<Bytes>& encodings) const;

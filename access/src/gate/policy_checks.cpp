@@ -1,0 +1,141 @@
+#include "gate/policy_checks.h"
+
+#include <algorithm>
+#include <chrono>
+#include <cstddef>
+#include <exception>
+
+#include <cxxabi.h>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/data_signature.h>
+#include <tarnik/text/display_text.h>
+
+#include "secret_text.h"
+
+namespace SsoClient::Access {
+
+namespace {
+
+constexpr std::size_t kMaxProofFailure = 300;
+
+// A presentation of a token.
+struct Presentation {
+  const GateConfig& config;
+  const CheckedToken& checked;
+  const SamlToken& token;
+  const Presenter& presenter;
+  std::string& detail;
+
+  bool IsBearer() const { return token.ConfirmationType() == BEARER; }
+};
+
+Reason CheckAudience(const Presentation& now) {
+  if (!now.checked.traits.isRestricted) {
+    return now.config.acceptsUnrestrictedTokens ? Reason::kNone : Reason::kUnrestricted;
+  }
+  return now.checked.traits.audience != nullptr ? Reason::kNone : Reason::kWrongAudience;
+}
+
+Reason CheckConfirmation(const Presentation& now) {
+  const bool isWelcome = !now.IsBearer() || now.config.bearerTokens == BearerTokens::kAccept;
+  return isWelcome ? Reason::kNone : Reason::kBearerRefused;
+}
+
+bool Proves(const Presenter& presenter, const Tarnik::Crypto::Certificate& holder) {
+  if (presenter.GetKind() == Presenter::Kind::kTlsCertificate) {
+    return Tarnik::Crypto::IsSameCertificate(*presenter.Certificate(), holder);
+  }
+  return presenter.GetKind() == Presenter::Kind::kSignature &&
+         Tarnik::Crypto::VerifyData(holder, presenter.Algorithm(), presenter.Data(),
+                                    presenter.Signature());
+}
+
+Reason CheckPossession(const Presentation& now) {
+  if (now.IsBearer()) {
+    return Reason::kNone;
+  }
+  if (now.presenter.GetKind() == Presenter::Kind::kNobody) {
+    return Reason::kNoProof;
+  }
+  try {
+    const auto holder = now.token.HolderOfKeyCertificate();
+    return holder != nullptr && Proves(now.presenter, *holder) ? Reason::kNone
+                                                               : Reason::kWrongProof;
+  } catch (const Tarnik::Exception& e) {
+    now.detail = Tarnik::ToDisplayText(e.Message(), kMaxProofFailure);
+    return Reason::kWrongProof;
+  }
+}
+
+Reason CheckLifetime(const Presentation& now) {
+  // Both are in the range of `DateTime`, so that their difference does not overflow.
+  const std::chrono::microseconds lifetime(now.token.ExpirationTime().GetUtcTime() -
+                                           now.token.StartTime().GetUtcTime());
+  return lifetime <= now.config.longestLifetime ? Reason::kNone : Reason::kTooLongLived;
+}
+
+Reason CheckDelegation(const Presentation& now) {
+  return now.checked.traits.delegates <= now.config.deepestDelegation ? Reason::kNone
+                                                                      : Reason::kTooDeeplyDelegated;
+}
+
+Reason CheckGroups(const Presentation& now) {
+  return now.config.allowedGroups.empty() || now.checked.traits.group != nullptr
+             ? Reason::kNone
+             : Reason::kNotInGroup;
+}
+
+Reason CallPredicate(const Presentation& now) {
+  std::string why;
+  if (now.config.predicate(now.token, why)) {
+    return Reason::kNone;
+  }
+  now.detail = ToRecordText(why);
+  return Reason::kRefusedByPredicate;
+}
+
+Reason CheckPredicate(const Presentation& now) {
+  if (!now.config.predicate) {
+    return Reason::kNone;
+  }
+  try {
+    return CallPredicate(now);
+  } catch (const std::exception& e) {
+    const char* const what = e.what();
+    now.detail = ToRecordText(what != nullptr ? what : "");
+  } catch (const abi::__forced_unwind&) {
+    throw;  // the thread is being cancelled
+  } catch (...) {
+    now.detail = "an exception that is not a std::exception";
+  }
+  return Reason::kPredicateFailed;
+}
+
+struct PolicyCheck {
+  CheckKind kind;
+  Reason (*check)(const Presentation&);
+};
+
+constexpr PolicyCheck kPolicyChecks[] = {
+    {CheckKind::kAudience, CheckAudience},     {CheckKind::kConfirmation, CheckConfirmation},
+    {CheckKind::kPossession, CheckPossession}, {CheckKind::kLifetime, CheckLifetime},
+    {CheckKind::kDelegation, CheckDelegation}, {CheckKind::kGroups, CheckGroups},
+    {CheckKind::kPredicate, CheckPredicate},
+};
+
+}  // namespace
+
+CheckResult CheckPolicy(const CheckedToken& checked, const Presenter& presenter,
+                        std::string& detail) {
+  const Presentation now{*checked.config, checked, *checked.token, presenter, detail};
+  for (const PolicyCheck& policy : kPolicyChecks) {
+    if (const Reason reason = policy.check(now); reason != Reason::kNone) {
+      return {policy.kind, reason};
+    }
+  }
+  return {CheckKind::kPredicate, Reason::kNone};
+}
+
+}  // namespace SsoClient::Access

@@ -1,0 +1,177 @@
+#include "trust/trust_builder.h"
+
+#include <algorithm>
+#include <atomic>
+#include <cstddef>
+#include <map>
+#include <string_view>
+#include <utility>
+
+#include <boost/smart_ptr/intrusive_ptr.hpp>
+
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/revocation_list.h>
+#include <tarnik/text/display_text.h>
+
+#include "trust/trust_entry.h"
+
+namespace SsoClient::Access {
+
+namespace {
+
+using Tarnik::Ref;
+using Tarnik::Crypto::Certificate;
+using Tarnik::Crypto::RevocationList;
+using Tarnik::Crypto::Sha256Digest;
+using Tarnik::Xml::Security::CertificateCandidatesResolver;
+
+constexpr std::size_t kLongestSubject = 200;
+
+std::uint64_t NextVersion() noexcept {
+  static std::atomic<std::uint64_t> last{0};
+  return last.fetch_add(1, std::memory_order_relaxed) + 1;
+}
+
+Signer MakeSigner(const Ref<const Certificate>& certificate) {
+  Signer signer;
+  signer.certificate = certificate;
+  signer.notBefore = certificate->NotBefore();
+  signer.notAfter = certificate->NotAfter();
+  signer.resolver = Tarnik::Xml::Security::CreateTrustedCertificatesResolver({certificate});
+  signer.name = Tarnik::ToDisplayText(certificate->SubjectName(), kLongestSubject) + " (SHA-256 " +
+                Tarnik::Crypto::FingerprintText(*certificate) + ")";
+  return signer;
+}
+
+// Of several lists the latest one counts; of several of one date, all of them.
+void Consider(const RevocationList& list, Signer& signer) {
+  if (!list.Covers(*signer.certificate)) {
+    return;
+  }
+  const auto from = list.ThisUpdate();
+  if (signer.listFrom && from < *signer.listFrom) {
+    return;
+  }
+  if (!signer.listFrom || *signer.listFrom < from) {
+    signer.listFrom = from;
+    signer.listUntil.reset();
+    signer.revokedSince.reset();
+  }
+  const auto until = list.NextUpdate();
+  signer.listUntil = signer.listUntil ? std::min(*signer.listUntil, until) : until;
+  if (const auto since = list.RevokedSince(*signer.certificate)) {
+    signer.revokedSince = signer.revokedSince ? std::min(*signer.revokedSince, *since) : *since;
+  }
+}
+
+// The signers of one issuer; those of its own entries come first.
+struct BuiltIssuer {
+  IssuerTrust trust;
+  std::vector<std::string> ownPaths;  // `TrustedSigner::path` of its own signers
+};
+
+class IssuerBuilder {
+ public:
+  explicit IssuerBuilder(std::set<Sha256Digest>& fingerprints) : fingerprints_(fingerprints) {}
+
+  void Add(const TrustEntry& entry, bool isOwn) {
+    for (const TrustEntry::Found& found : entry.certificates) {
+      const auto digest = Tarnik::Crypto::Fingerprint(*found.certificate);
+      const auto [place, isNew] = places_.try_emplace(digest, built_.trust.signers.size());
+      if (isNew) {
+        fingerprints_.insert(digest);
+        built_.trust.signers.push_back(MakeSigner(found.certificate));
+        if (isOwn) {
+          built_.ownPaths.push_back(found.path);
+        }
+      }
+      Signer& signer = built_.trust.signers[place->second];
+      signer.isRevocationChecked = signer.isRevocationChecked || entry.isRevocationChecked;
+      for (const auto& list : entry.lists) {
+        Consider(*list, signer);
+      }
+    }
+  }
+
+  BuiltIssuer Build() {
+    IssuerTrust& trust = built_.trust;
+    if (!trust.signers.empty()) {
+      std::vector<Ref<const Certificate>> certificates;
+      certificates.reserve(trust.signers.size());
+      for (const Signer& signer : trust.signers) {
+        certificates.push_back(signer.certificate);
+      }
+      trust.resolver = boost::dynamic_pointer_cast<const CertificateCandidatesResolver>(
+          Tarnik::Xml::Security::CreateTrustedCertificatesResolver(std::move(certificates)));
+    }
+    return std::move(built_);
+  }
+
+ private:
+  std::set<Sha256Digest>& fingerprints_;
+  BuiltIssuer built_;
+  std::map<Sha256Digest, std::size_t> places_;
+};
+
+BuiltIssuer BuildIssuer(const std::vector<TrustEntry>& entries, std::string_view issuer,
+                        std::set<Sha256Digest>& fingerprints) {
+  IssuerBuilder builder(fingerprints);
+  for (const TrustEntry& entry : entries) {
+    if (entry.issuer == issuer) {
+      builder.Add(entry, true);
+    }
+  }
+  for (const TrustEntry& entry : entries) {
+    if (entry.issuer.empty() && !issuer.empty()) {
+      builder.Add(entry, false);
+    }
+  }
+  return builder.Build();
+}
+
+// Appends the issuer's own signers to `described`.
+void Describe(const std::string& issuer, const BuiltIssuer& built,
+              std::vector<TrustedSigner>& described) {
+  for (std::size_t i = 0; i < built.ownPaths.size(); ++i) {
+    const Signer& signer = built.trust.signers[i];
+    TrustedSigner& entry = described.emplace_back();
+    entry.issuer = issuer;
+    entry.certificate = signer.certificate;
+    entry.path = built.ownPaths[i];
+    entry.isRevocationChecked = signer.isRevocationChecked;
+    if (signer.revokedSince) {
+      entry.revokedSince = *signer.revokedSince;
+    }
+    if (signer.listUntil) {
+      entry.listUntil = *signer.listUntil;
+    }
+  }
+}
+
+}  // namespace
+
+std::shared_ptr<const Trust> BuildTrust(const std::vector<TrustedIssuer>& issuers,
+                                        const TrustContents& contents) {
+  std::vector<TrustEntry> entries;
+  entries.reserve(issuers.size());
+  for (std::size_t i = 0; i < issuers.size(); ++i) {
+    entries.push_back(DecodeEntry(issuers[i], contents.entries[i]));
+  }
+  std::set<Sha256Digest> fingerprints;
+  std::vector<TrustedSigner> signers;
+  std::map<std::string, IssuerTrust, std::less<>> named;
+  IssuerTrust others;
+  std::set<std::string_view> done;
+  for (const TrustEntry& entry : entries) {
+    if (done.insert(entry.issuer).second) {
+      BuiltIssuer built = BuildIssuer(entries, entry.issuer, fingerprints);
+      Describe(entry.issuer, built, signers);
+      (entry.issuer.empty() ? others : named[entry.issuer]) = std::move(built.trust);
+    }
+  }
+  TrustSnapshot snapshot(std::move(named), std::move(others), NextVersion());
+  return std::make_shared<const Trust>(
+      Trust{std::move(snapshot), std::move(signers), std::move(fingerprints), contents.digest});
+}
+
+}  // namespace SsoClient::Access

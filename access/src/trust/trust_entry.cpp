@@ -1,0 +1,81 @@
+#include "trust/trust_entry.h"
+
+#include <algorithm>
+#include <string_view>
+#include <utility>
+
+#include <tarnik/crypto/crypto_exception.h>
+
+namespace SsoClient::Access {
+
+namespace {
+
+using Tarnik::Ref;
+using Tarnik::Crypto::Certificate;
+using Tarnik::Crypto::RevocationList;
+
+[[noreturn]] void ThrowUnusable(const std::string& path, const std::string& why) {
+  throw Tarnik::Crypto::CryptoException("The trust file '" + path + "' cannot be used: " + why);
+}
+
+// Returns `decode(content.bytes)`, with the name of the file in exceptions.
+template <class Decode>
+auto DecodeFile(const FileContent& content, const Decode& decode) {
+  try {
+    return decode(content.bytes);
+  } catch (const Tarnik::Crypto::CryptoException& error) {
+    ThrowUnusable(content.path, error.Message());
+  }
+}
+
+std::vector<Ref<const Certificate>> DecodeCertificates(const FileContent& file) {
+  return DecodeFile(file, [](std::string_view bytes) {
+    auto certificates = Tarnik::Crypto::CreateCertificatesFromPemOrDer(bytes);
+    for (const auto& certificate : certificates) {
+      certificate->GetPublicKey();  // throws for a key that no signature could be verified with
+    }
+    return certificates;
+  });
+}
+
+bool IsFromOneOf(const RevocationList& list, const std::vector<Ref<const Certificate>>& signers) {
+  return std::any_of(signers.begin(), signers.end(),
+                     [&list](const auto& signer) { return list.IsFrom(*signer); });
+}
+
+}  // namespace
+
+TrustEntry DecodeEntry(const TrustedIssuer& issuer, const TrustContents::Entry& contents) {
+  TrustEntry entry;
+  entry.issuer = issuer.issuer;
+  entry.isRevocationChecked = !issuer.revocationListPaths.empty();
+  std::vector<Ref<const Certificate>> listSigners;
+  for (const FileContent& file : contents.listSigners) {
+    const auto certificates = DecodeCertificates(file);
+    listSigners.insert(listSigners.end(), certificates.begin(), certificates.end());
+  }
+  for (const auto& certificate : issuer.certificates) {
+    entry.certificates.push_back({certificate, {}});
+    listSigners.push_back(certificate);
+  }
+  for (const FileContent& file : contents.certificates) {
+    for (const auto& certificate : DecodeCertificates(file)) {
+      entry.certificates.push_back({certificate, file.path});
+      listSigners.push_back(certificate);
+    }
+  }
+  for (const FileContent& file : contents.lists) {
+    const auto lists = DecodeFile(file, [](std::string_view bytes) {
+      return Tarnik::Crypto::CreateRevocationListsFromPemOrDer(bytes);
+    });
+    for (const auto& list : lists) {
+      if (!IsFromOneOf(*list, listSigners)) {
+        ThrowUnusable(file.path, "No certificate of the entry has signed the revocation list.");
+      }
+      entry.lists.push_back(list);
+    }
+  }
+  return entry;
+}
+
+}  // namespace SsoClient::Access

@@ -1,0 +1,52 @@
+#include "trust/trust_snapshot.h"
+
+#include <algorithm>
+#include <utility>
+
+#include <tarnik/crypto/certificate.h>
+
+namespace SsoClient::Access {
+
+namespace {
+
+constexpr std::size_t kMostCandidates = 16;
+
+const Signer* FindCertificate(const std::vector<Signer>& signers,
+                              const Tarnik::Crypto::Certificate& certificate) {
+  // The resolver returns the objects that it was given.
+  const auto found = std::find_if(
+      signers.begin(), signers.end(),
+      [&certificate](const Signer& signer) { return signer.certificate.get() == &certificate; });
+  return found == signers.end() ? nullptr : &*found;
+}
+
+}  // namespace
+
+std::vector<const Signer*> IssuerTrust::Select(
+    const Tarnik::Xml::Security::KeyInfo& keyInfo) const {
+  std::vector<const Signer*> selected;
+  if (resolver == nullptr) {
+    return selected;
+  }
+  for (const auto& certificate : resolver->CandidateCertificates(keyInfo)) {
+    if (selected.size() == kMostCandidates) {
+      break;
+    }
+    if (const Signer* const signer = FindCertificate(signers, *certificate)) {
+      selected.push_back(signer);
+    }
+  }
+  return selected;
+}
+
+TrustSnapshot::TrustSnapshot(std::map<std::string, IssuerTrust, std::less<>> named,
+                             IssuerTrust others, std::uint64_t version)
+    : named_(std::move(named)), others_(std::move(others)), version_(version) {}
+
+const IssuerTrust* TrustSnapshot::Find(std::string_view issuer) const {
+  const auto found = named_.find(issuer);
+  const IssuerTrust& trust = found == named_.end() ? others_ : found->second;
+  return trust.signers.empty() ? nullptr : &trust;
+}
+
+}  // namespace SsoClient::Access
