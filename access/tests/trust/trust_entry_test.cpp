@@ -1,0 +1,193 @@
+#include "trust/trust_entry.h"
+
+#include <ctime>
+#include <filesystem>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include <tarnik/crypto/crypto_exception.h>
+
+#include "trust/trust_fixture.h"
+
+namespace SsoClient::Access::Testing {
+
+namespace {
+
+using Tarnik::Crypto::CryptoException;
+using Tarnik::Testing::MakeCrl;
+
+/// A store whose folder "lists" contains lists of `TrustCa`.
+class TrustEntryTest : public TrustFixture {
+ protected:
+  TrustEntryTest() {
+    std::filesystem::create_directory(PathOf("lists"));
+    config.issuers[0].revocationListPaths = {PathOf("lists")};
+    config.issuers[0].listSignerPaths = {Put("ca.pem", TrustCa().Pem())};
+  }
+
+  const Signer& First() {
+    snapshot = store->Current();
+    return snapshot->Find(kIssuer)->signers.at(0);
+  }
+
+  static constexpr const char* kForeignList =
+      "The trust file '/lists/a.crl' cannot be used: No certificate of the entry has signed the "
+      "revocation list.";
+
+  std::shared_ptr<const TrustSnapshot> snapshot;
+};
+
+TEST_F(TrustEntryTest, WithoutPathsRevocationIsNotChecked) {
+  config.issuers[0].revocationListPaths.clear();
+  config.issuers[0].listSignerPaths.clear();
+  Make();
+  EXPECT_FALSE(First().isRevocationChecked);
+  EXPECT_FALSE(First().listUntil);
+}
+
+TEST_F(TrustEntryTest, CertificateWhoseKeyCannotBeUsedIsAnError) {
+  const auto certificate = Sts(0).ToCertificate();
+  std::string der(reinterpret_cast<const char*>(certificate->DerBytes()), certificate->DerLength());
+  Put("trust/a.pem", der);
+  Make();
+  EXPECT_EQ(Signers(), Names{"CN=sts-0"});
+  // id-ecPublicKey (RFC 5480, section 2.1.1) becomes an identifier that nobody knows.
+  const std::size_t place = der.find("\x2a\x86\x48\xce\x3d\x02\x01");
+  ASSERT_NE(place, std::string::npos);
+  der[place + 6] = '\x7f';
+  Put("trust/a.pem", der);
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] {
+              store->Reload();
+            })).rfind("The trust file '/trust/a.pem' cannot be used: ", 0),
+            0U);
+}
+
+TEST_F(TrustEntryTest, FolderWithoutAListLeavesRevocationUnknown) {
+  Make();
+  EXPECT_TRUE(First().isRevocationChecked);
+  EXPECT_FALSE(First().listFrom);
+  EXPECT_FALSE(First().listUntil);
+}
+
+TEST_F(TrustEntryTest, ListOfTheIssuerCoversItsCertificates) {
+  const std::time_t now = std::time(nullptr);
+  Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(1), 100, -200, now));
+  Put("trust/b.pem", Sts(1).Pem());
+  Make();
+  EXPECT_FALSE(First().revokedSince);
+  EXPECT_EQ(First().listFrom->GetUtcTime(), (now - 200) * 1'000'000);
+  EXPECT_EQ(First().listUntil->GetUtcTime(), (now + 100) * 1'000'000);
+  EXPECT_EQ(snapshot->Find(kIssuer)->signers.at(1).revokedSince->GetUtcTime(),
+            (now - 200) * 1'000'000);
+}
+
+TEST_F(TrustEntryTest, ListThatIsAddedCounts) {
+  Make();
+  Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(0)));
+  Wait();
+  EXPECT_TRUE(First().revokedSince);
+  ASSERT_EQ(listener->replaced.size(), 1U);
+  EXPECT_EQ(listener->replaced[0].added, 0U);
+  EXPECT_EQ(listener->replaced[0].removed, 0U);
+}
+
+TEST_F(TrustEntryTest, ListThatIsRemovedNoLongerCovers) {
+  Put("lists/a.crl", MakeCrl(TrustCa(), nullptr));
+  Make();
+  EXPECT_TRUE(First().listUntil);
+  Remove("lists/a.crl");
+  Wait();
+  EXPECT_FALSE(First().listUntil);
+  EXPECT_TRUE(First().isRevocationChecked);
+}
+
+TEST_F(TrustEntryTest, ListsOutOfDateAndOfTheFutureAreLoaded) {
+  Put("lists/a.crl", MakeCrl(TrustCa(), nullptr, -10, -100));
+  Make();
+  EXPECT_LT(First().listUntil->GetUtcTime(), std::time(nullptr) * 1'000'000);
+  Put("lists/a.crl", MakeCrl(TrustCa(), nullptr, 1000, 500));
+  Wait();
+  EXPECT_GT(First().listFrom->GetUtcTime(), std::time(nullptr) * 1'000'000);
+  EXPECT_EQ(Failure(), "");
+}
+
+TEST_F(TrustEntryTest, LatestListCounts) {
+  Put("lists/a.crl",
+      MakeCrl(TrustCa(), &Sts(0), 3600, -100) + MakeCrl(TrustCa(), nullptr, 3600, -200));
+  Make();
+  EXPECT_TRUE(First().revokedSince);
+  Put("lists/b.crl", MakeCrl(TrustCa(), nullptr, 3600, -50));
+  Wait();
+  EXPECT_FALSE(First().revokedSince);
+}
+
+TEST_F(TrustEntryTest, ListsOfOneDateAllCount) {
+  const std::time_t now = std::time(nullptr);
+  for (const bool isRevokedFirst : {true, false}) {
+    const std::string revoking = MakeCrl(TrustCa(), &Sts(0), 900, -100, now);
+    const std::string other = MakeCrl(TrustCa(), nullptr, 500, -100, now);
+    Put("lists/a.crl", isRevokedFirst ? revoking + other : other + revoking);
+    Make();
+    EXPECT_TRUE(First().revokedSince);
+    EXPECT_EQ(First().listUntil->GetUtcTime(), (now + 500) * 1'000'000);
+  }
+}
+
+TEST_F(TrustEntryTest, ListOfAStrangerWithTheSameNameIsAnError) {
+  Put("lists/a.crl", MakeCrl(StrangeCa(), &Sts(1)));
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] { Make(); })), kForeignList);
+  Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(1)));
+  Make();
+  Put("lists/a.crl", MakeCrl(StrangeCa(), nullptr));
+  Wait();
+  EXPECT_EQ(Failure(), kForeignList);
+  EXPECT_TRUE(First().listUntil);
+  EXPECT_EQ(listener->kept.size(), 1U);
+}
+
+TEST_F(TrustEntryTest, ListOfAnotherIssuerIsAnErrorUnlessItsSignerIsGiven) {
+  const Identity other = Tarnik::Testing::MakeCa("Other");
+  Put("lists/a.crl", MakeCrl(other, nullptr));
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] { Make(); })), kForeignList);
+  config.issuers[0].listSignerPaths.push_back(Put("other.pem", other.Pem()));
+  Make();
+  EXPECT_FALSE(First().listUntil);
+}
+
+TEST_F(TrustEntryTest, TrustedCertificateMaySignItsOwnList) {
+  const Identity own = Tarnik::Testing::MakeIdentity({}, nullptr);
+  Put("trust/a.pem", own.Pem());
+  Put("lists/a.crl", MakeCrl(own, nullptr));
+  Make();
+  EXPECT_TRUE(First().listUntil);
+}
+
+TEST_F(TrustEntryTest, SignersOfListsAreNotTrusted) {
+  Make();
+  EXPECT_EQ(Signers(), Names{"CN=sts-0"});
+}
+
+TEST_F(TrustEntryTest, FileOfListsWithoutAListIsAnError) {
+  Put("lists/a.pem", Sts(0).Pem());
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] {
+              Make();
+            })).rfind("The trust file '/lists/a.pem' cannot be used: ", 0),
+            0U);
+}
+
+TEST_F(TrustEntryTest, HalfAListIsAnError) {
+  const std::string list = MakeCrl(TrustCa(), &Sts(0));
+  Put("lists/a.crl", list);
+  Make();
+  for (const std::size_t length :
+       {std::size_t{0}, std::size_t{4}, std::size_t{100}, list.size() - 20}) {
+    Put("lists/a.crl", list.substr(0, length));
+    EXPECT_THROW(store->Reload(), CryptoException) << length;
+    EXPECT_TRUE(First().revokedSince);
+  }
+}
+
+}  // namespace
+
+}  // namespace SsoClient::Access::Testing

@@ -1,0 +1,59 @@
+#include "guard.h"
+
+#include <iostream>
+
+namespace GuardedServer {
+namespace {
+
+namespace http = boost::beast::http;
+using SsoClient::Access::Remedy;
+using SsoClient::Access::Verdict;
+
+Response MakeResponse(const Request& request, http::status status, std::string body) {
+  Response response(status, request.version());
+  response.set(http::field::content_type, "text/plain; charset=utf-8");
+  response.set(http::field::cache_control, "no-store");
+  response.body() = std::move(body);
+  return response;
+}
+
+// RFC 6750, section 3
+Response Challenge(const Request& request, http::status status, const char* challenge) {
+  Response response = MakeResponse(request, status, "");
+  response.set(http::field::www_authenticate, challenge);
+  return response;
+}
+
+/// The answer does not say what this service trusts; the log does.
+Response Refuse(const Request& request, const Verdict& verdict, const std::string& sender) {
+  std::cerr << "refused " + sender + '\n' + verdict.ToString();
+  switch (RemedyOf(verdict.Refusal())) {
+    case Remedy::kAccess:
+      return MakeResponse(request, http::status::forbidden, "");
+    case Remedy::kService:
+      return MakeResponse(request, http::status::service_unavailable, "");
+    default:
+      return Challenge(request, http::status::unauthorized, "Bearer error=\"invalid_token\"");
+  }
+}
+
+}  // namespace
+
+Response Guard::Answer(const Request& request, const SsoClient::Access::Presenter& presenter,
+                       const std::string& sender) const try {
+  const auto token = TokenIn(request);
+  if (!token) {
+    return Challenge(request, http::status::unauthorized, "Bearer");
+  }
+  const Verdict verdict = gate_->Check(*token, presenter);
+  if (!verdict.IsAccepted()) {
+    return Refuse(request, verdict, sender);
+  }
+  const auto& subject = verdict.Token()->Subject();
+  return MakeResponse(request, http::status::ok, subject.name + '@' + subject.domain + '\n');
+} catch (const MalformedRequest& e) {
+  std::cerr << "malformed request from " + sender + ": " + e.what() + '\n';
+  return Challenge(request, http::status::bad_request, "Bearer error=\"invalid_request\"");
+}
+
+}  // namespace GuardedServer
