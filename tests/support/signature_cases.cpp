@@ -210,8 +210,7 @@ std::vector<TokenCase> TransformCases() {
        Fate::kBadSignature},
       {"none", with(""), Fate::kBadSignature},
       {"not enveloped", with(begin + exclusive + end), Fate::kBadSignature},
-      {"exclusive first",
-       WithSignedInfo(enveloped + exclusive + end, exclusive + enveloped + end),
+      {"exclusive first", WithSignedInfo(enveloped + exclusive + end, exclusive + enveloped + end),
        Fate::kBadSignature}};
   for (const char* algorithm :
        {"", "urn:unknown", "http://www.w3.org/TR/1999/REC-xslt-19991116",

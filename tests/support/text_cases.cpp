@@ -1,6 +1,7 @@
 // Token cases about the text and its values.
 #include <cstddef>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "support/assertion_text.h"
@@ -76,7 +77,9 @@ std::vector<TokenCase> EditCases() {
     cases.push_back({edit.to, Replaced(Delegated(), edit.from, edit.to), Fate::kAccepted});
   }
   for (const Edit& edit : ValueEdits()) {
-    cases.push_back({edit.to, Replaced(Delegated(), edit.from, edit.to), Fate::kBadSignature});
+    const bool isOfIssuer = std::string_view(edit.from) == "https://sts.example.com/STS";
+    cases.push_back({edit.to, Replaced(Delegated(), edit.from, edit.to),
+                     isOfIssuer ? Fate::kNoTrustedKey : Fate::kBadSignature});
   }
   return cases;
 }

@@ -11,7 +11,7 @@ enum class Fate {
   kAccepted,
   kNotXml,        ///< the parser refuses it
   kNotAToken,     ///< it does not have the structure of a token
-  kNoTrustedKey,  ///< its signature names no trusted key
+  kNoTrustedKey,  ///< its signature names no trusted key, or it has another issuer
   kBadSignature,  ///< its signature does not verify
   kRefused,       ///< for one of these reasons
 };
