@@ -1,7 +1,7 @@
 // The example of a server that accepts callers by their tokens.
-#include <array>
 #include <chrono>
 #include <cstddef>
+#include <cstdint>
 #include <filesystem>
 #include <memory>
 #include <optional>
@@ -9,13 +9,10 @@
 #include <utility>
 #include <vector>
 
-#include <boost/asio/buffer.hpp>
-#include <boost/asio/io_context.hpp>
-#include <boost/asio/ip/tcp.hpp>
-#include <boost/asio/read.hpp>
-#include <boost/asio/write.hpp>
 #include <gmock/gmock.h>
+#include <netinet/in.h>
 #include <signal.h>
+#include <sys/socket.h>
 
 #include <tarnik/http/connection_specs.h>
 #include <tarnik/http/http_request.h>
@@ -27,6 +24,7 @@
 #include "integration/holder_of_key_fixture.h"
 #include "support/child_process.h"
 #include "support/holder_of_key.h"
+#include "support/loopback.h"
 #include "support/temporary_file.h"
 
 namespace SsoClient::Access {
@@ -128,26 +126,25 @@ Answer Ask(Tarnik::Http::UserAgent& agent, const Message& message) {
 /// A TCP connection without TLS.
 class RawConnection {
  public:
-  explicit RawConnection(int port) : socket_(io_) {
-    socket_.connect({boost::asio::ip::address_v4::loopback(), static_cast<unsigned short>(port)});
+  explicit RawConnection(int port) : socket_(socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_port = htons(static_cast<std::uint16_t>(port));
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    const int result =
+        connect(socket_.Get(), reinterpret_cast<const sockaddr*>(&address), sizeof address);
+    EXPECT_EQ(result, 0) << "cannot connect";
   }
-  void Send(const std::string& bytes) { boost::asio::write(socket_, boost::asio::buffer(bytes)); }
+  void Send(const std::string& bytes) { Tarnik::Testing::SendAll(socket_.Get(), bytes); }
   /// Waits until the server closes the connection.
-  void AwaitEnd() {
-    std::array<char, 512> bytes;
-    boost::system::error_code error;
-    while (!error) {
-      socket_.read_some(boost::asio::buffer(bytes), error);
-    }
-  }
+  void AwaitEnd() { Tarnik::Testing::ReceiveExactly(socket_.Get(), 1'000'000); }
   void Reset() {
-    socket_.set_option(boost::asio::socket_base::linger(true, 0));
-    socket_.close();
+    Tarnik::Testing::ResetOnClose(socket_.Get());
+    socket_.Close();
   }
 
  private:
-  boost::asio::io_context io_;
-  boost::asio::ip::tcp::socket socket_;
+  Tarnik::Testing::Descriptor socket_;
 };
 
 class GuardedServerTest : public SsoClient::Testing::HolderOfKeyTest {
