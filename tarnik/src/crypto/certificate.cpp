@@ -1,7 +1,6 @@
-#include <chrono>
 #include <climits>
-#include <ctime>
 #include <mutex>
+#include <optional>
 #include <utility>
 
 #include <openssl/pem.h>
@@ -13,17 +12,13 @@
 #include "crypto/load_file.h"
 #include "crypto/pem.h"
 #include "crypto/public_key_impl.h"
+#include "crypto/x509_values.h"
 #include "support/object_lock.h"
 #include "support/openssl.h"
 #include "support/openssl_error.h"
 
 namespace Tarnik::Crypto {
 namespace {
-
-// RFC 2253, section 2.4 allows unescaped UTF-8, which other programs write. Escaped bytes would
-// never match their names.
-constexpr unsigned long kNameFlags =
-    XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
 
 [[noreturn]] void ThrowBroken(const OpenSsl::ErrorScope& errors, const char* part) {
   throw CryptoException(
@@ -52,13 +47,11 @@ OpenSsl::OwnedCertificate Decode(const std::vector<unsigned char>& der) {
 
 std::string NameText(const X509_NAME* name, const char* part) {
   const OpenSsl::ErrorScope errors;
-  const OpenSsl::OwnedBio memory(BIO_new(BIO_s_mem()));
-  if (memory == nullptr || X509_NAME_print_ex(memory.get(), name, 0, kNameFlags) < 0) {
+  std::optional<std::string> text = TextOfName(name);
+  if (!text) {
     ThrowBroken(errors, part);
   }
-  char* text = nullptr;
-  const long length = BIO_get_mem_data(memory.get(), &text);
-  return length > 0 ? std::string(text, static_cast<std::size_t>(length)) : std::string();
+  return std::move(*text);
 }
 
 // RFC 5280, section 4.1.2.2 allows 20. The time to convert a number grows with the square of its
@@ -81,19 +74,11 @@ std::string SerialText(const ASN1_INTEGER* serial) {
 
 System::DateTime Time(const ASN1_TIME* time, const char* part) {
   const OpenSsl::ErrorScope errors;
-  std::tm fields{};
-  // ASN1_TIME_to_tm returns the current time for null.
-  if (time == nullptr || ASN1_TIME_to_tm(time, &fields) != 1) {
+  const std::optional<System::DateTime> instant = InstantOf(time);
+  if (!instant) {
     ThrowBroken(errors, part);
   }
-  using namespace std::chrono;
-  const auto date =
-      year_month_day(year(fields.tm_year + 1900), month(static_cast<unsigned>(fields.tm_mon + 1)),
-                     day(static_cast<unsigned>(fields.tm_mday)));
-  const auto instant =
-      sys_days(date) + hours(fields.tm_hour) + minutes(fields.tm_min) + seconds(fields.tm_sec);
-  return System::DateTimeFromUtc(duration_cast<microseconds>(instant.time_since_epoch()).count(),
-                                 false);
+  return *instant;
 }
 
 std::vector<unsigned char> SubjectKeyIdentifierOf(X509* certificate) {

@@ -151,6 +151,18 @@ OpenSsl::OwnedKey Decode(PemBlock& block, Passphrase& passphrase) {
   return DecodeTraditional(block, passphrase);
 }
 
+// The scope of errors ends before the value is verified, which puts errors of the host program back
+// into the queue as new ones.
+void SignWith(EVP_PKEY_CTX* context, const unsigned char* digest, std::size_t digestLength,
+              std::vector<unsigned char>& value) {
+  const OpenSsl::ErrorScope errors;
+  std::size_t length = value.size();
+  if (EVP_PKEY_sign(context, value.data(), &length, digest, digestLength) != 1) {
+    throw CryptoException(errors.Describe("The signature cannot be made"));
+  }
+  value.resize(length);
+}
+
 }  // namespace
 
 PrivateKeyImpl::PrivateKeyImpl(OpenSsl::OwnedKey key)
@@ -173,14 +185,9 @@ std::string PrivateKeyImpl::ToString() const {
 
 std::vector<unsigned char> PrivateKeyImpl::Sign(SignatureScheme scheme, Hash hash,
                                                 const unsigned char* digest) const {
-  const OpenSsl::ErrorScope errors;
   OpenSsl::OwnedKeyContext context = contexts_.Take(key_.get(), scheme, hash);
   std::vector<unsigned char> value(publicKey_->ValueLength());
-  std::size_t length = value.size();
-  if (EVP_PKEY_sign(context.get(), value.data(), &length, digest, HashLength(hash)) != 1) {
-    throw CryptoException(errors.Describe("The signature cannot be made"));
-  }
-  value.resize(length);
+  SignWith(context.get(), digest, HashLength(hash), value);
   // When an allocation fails while OpenSSL blinds the key, it reports a wrong value as a success.
   // Such a value also endangers the key.
   if (scheme != SignatureScheme::kEcdsa &&

@@ -13,8 +13,8 @@ namespace Tarnik::Crypto {
 using Sha256Digest = std::array<unsigned char, 32>;
 
 /// The SHA-256 digest of `bytes`. Safe from many threads. Throws `CryptoException` when OpenSSL
-/// does not provide SHA-256 or memory runs out; once it has succeeded on a thread, it needs no more
-/// memory there.
+/// does not provide SHA-256, or memory runs out: OpenSSL may allocate some bytes for each digest,
+/// and nothing else is allocated once a few digests were computed.
 TARNIK_EXPORT Sha256Digest Sha256(std::string_view bytes);
 
 /// True when the `length` bytes at `a` and at `b` are equal. The time depends only on `length`, so

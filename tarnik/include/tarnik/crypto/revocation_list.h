@@ -26,30 +26,34 @@ class TARNIK_EXPORT RevocationList : public virtual Object {
   /// When the list was issued, and by when the next one will be.
   virtual System::DateTime ThisUpdate() const = 0;
   virtual System::DateTime NextUpdate() const = 0;
-  /// True when the key of `issuer` signed the list and may: the subject is the list's issuer (RFC
-  /// 5280, section 7.1), a keyUsage extension includes cRLSign, the list's authority key identifier
-  /// does not name another key or certificate, the algorithm has SHA-256, SHA-384 or SHA-512, and
-  /// `VerifyData` accepts the key with it. False otherwise; also when `issuer` cannot be decoded.
-  /// Throws `CryptoException` when OpenSSL fails or memory runs out.
+  /// True when `issuer` made the list and was allowed to: its subject is the list's issuer (RFC
+  /// 5280, section 7.1), its keyUsage, if there is one, includes cRLSign, the list's authority key
+  /// identifier names no other key or certificate, and the signature, by an algorithm with SHA-256,
+  /// SHA-384 or SHA-512, verifies with its key, which fulfils the rules of `VerifyData`. Throws
+  /// `CryptoException` when the certificate, which may be of a caller's own class, or its key
+  /// cannot be decoded, when its key is restricted to other parameters, and when OpenSSL fails.
   ///
-  /// The signature is verified in each call, which takes as long as that of a token.
+  /// Each call decodes the certificate and verifies the signature.
   virtual bool IsFrom(const Certificate& issuer) const = 0;
-  /// True when `certificate` has the list's issuer (RFC 5280, section 7.1). False when it cannot be
-  /// decoded.
+  /// True when `certificate` has the list's issuer (RFC 5280, section 7.1). Throws
+  /// `CryptoException` when it is of a caller's own class and cannot be decoded.
   virtual bool Covers(const Certificate& certificate) const = 0;
-  /// Since when `certificate` is revoked, or none when it is not on the list or `Covers` is false
-  /// for it. A certificate on hold (reason certificateHold) is revoked.
+  /// Since when `certificate` is revoked, also if only until further notice (reason
+  /// certificateHold). None when it is not on the list or the list does not cover it. Throws as
+  /// above. Takes the time of a binary search.
   virtual boost::optional<System::DateTime> RevokedSince(const Certificate& certificate) const = 0;
 };
 
 /// Decodes one list. Throws `CryptoException` when
-///  - the bytes are not exactly one list in DER,
-///  - it has no nextUpdate (RFC 5280, section 5.1.2.5), or one that is before thisUpdate,
-///  - it is a delta list, or its issuingDistributionPoint says that it is indirect or does not
-///    contain all reasons or all kinds of certificates (RFC 5280, sections 5.2.4 and 5.2.5),
-///  - it or an entry has another critical extension, an extension twice or one that is broken, or
-///  - an entry names another issuer, is removeFromCRL, or has a serial number that is already
-///    listed, longer than 64 bytes.
+///  - the bytes are not exactly one list, or it names no issuer,
+///  - it has no nextUpdate (RFC 5280, section 5.1.2.5), or one before thisUpdate,
+///  - it is a delta list (section 5.2.4),
+///  - it has an issuingDistributionPoint (section 5.2.5), so that it may be indirect or leave out
+///    certificates or reasons,
+///  - an entry has another issuer or the reason removeFromCRL (sections 5.3.3 and 5.3.1), or
+///  - it or an entry has another critical extension, an extension twice, one of the above that
+///    cannot be decoded, or a serial number of more than 64 bytes.
+/// A serial number that is listed twice is revoked since the earlier time.
 TARNIK_EXPORT Ref<const RevocationList> CreateRevocationListFromDer(const unsigned char* bytes,
                                                                     std::size_t length);
 /// Reads every X509 CRL block of a PEM text (RFC 7468, section 7), in order; other blocks are
