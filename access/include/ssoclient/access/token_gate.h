@@ -27,11 +27,11 @@ enum class BearerTokens { kNotSaid, kRefuse, kAccept };
 
 /// The tokens that a gate remembers, so that it need not read and verify them again.
 struct GateCacheConfig {
-  /// The number of tokens; 0 for no cache. The one that was not presented for the longest is
-  /// evicted first.
+  /// The number of tokens; 0 for no cache. The cache is divided into up to 16 parts; of a part that
+  /// is full, the token that was not presented for the longest is evicted first.
   std::size_t tokens = 10000;
-  /// The memory of all tokens. A token of a kilobyte or more counts four and a half times the
-  /// length of its text.
+  /// The memory of all tokens. A token counts a kilobyte and four and a half times the length of
+  /// its text.
   std::size_t bytes = std::size_t{64} * 1024 * 1024;
 };
 
@@ -68,7 +68,8 @@ struct GateConfig {
   std::function<Tarnik::System::DateTime()> clock{};
 };
 
-/// Counters since the gate was made, and gauges. They are read one by one while others work.
+/// Counters since the gate was made, or since the fork in a child, and gauges. They are read one by
+/// one while others work.
 struct GateMetrics {
   std::uint64_t accepted = 0;
   /// By `Reason`, in the order of the enumeration, with an element for each; the first is zero.
@@ -85,8 +86,8 @@ struct GateMetrics {
 ///
 /// An accepted token is remembered by the SHA-256 of its whole text. When it is presented again, it
 /// is not read and its signature is not verified again while the trust store is unchanged; all
-/// other checks are made again, with the presenter and the time of that presentation. Nothing of a
-/// refused token is kept.
+/// other checks are made again, with the presenter and the time of that presentation. Nothing is
+/// kept of a token that was never accepted, nor of one that is presented after its end.
 ///
 /// Thread-safe; a check takes no lock for longer than a look-up in a part of the cache, and never
 /// waits for a file or the network. May be used in a forked child, where the cache begins empty.

@@ -90,11 +90,13 @@ struct CheckRecord {
 struct VerdictFacts;
 
 /// What a gate has decided about a token. A value, whose copies share their content; thread-safe as
-/// one. References that it returns are valid as long as any copy.
+/// one. References that it returns are valid as long as any copy. One that was moved from may only
+/// be assigned to and destroyed.
 class SSOCLIENT_ACCESS_EXPORT Verdict {
  public:
   bool IsAccepted() const noexcept;
-  /// The accepted token; null when it was refused.
+  /// The accepted token; null when it was refused. The gate reads tokens with the widest clock
+  /// tolerance: their `ExpirationTimeWithTolerance` is of no use.
   const std::shared_ptr<const SamlToken>& Token() const noexcept;
   /// `Reason::kNone` for an accepted token.
   Reason Refusal() const noexcept;
