@@ -109,6 +109,29 @@ TEST_F(AttemptsAtOnceTest, NobodyOvertakesThoseWhoWait) {
   EXPECT_TRUE(std::is_sorted(order.begin(), order.end()));
 }
 
+TEST_F(AttemptsAtOnceTest, RequestThatMayNotLogInForAWhileKeepsNoPlace) {
+  config.endpoints.resize(1);
+  config.retry.attemptsAtOnce = 1;
+  config.login = PasswordLogin{"alice", [this] { return password; }};
+  MakeAccepted();
+  std::shared_ptr<Reply> waiting;
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    waiting = Ask(SpecFor("waiting"));
+    runtime->Settle();
+    // The caller leaves. When the attempt ends, nobody knows whether the password is accepted.
+    runtime->Pass(seconds(11));
+    ForAll(Issues(hours(1)));
+    return Failed<CommunicationException>(FailureKind::kTimedOut, "It is silent.");
+  });
+  EXPECT_TRUE(Get(SpecFor("left"), Within(seconds(1))).Is<CommunicationException>());
+  EXPECT_FALSE(waiting->Has());
+  password = "another";
+  EXPECT_NE(Get(SpecFor("other")).token, nullptr);
+  password = "secret";
+  runtime->Advance(seconds(1));
+  EXPECT_NE(waiting->token, nullptr);
+}
+
 TEST_F(AttemptsAtOnceTest, SilentEndpointLeavesTheOtherOneItsShare) {
   config.retry.attemptsAtOnce = 4;
   MakeAccepted();

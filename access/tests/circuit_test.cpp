@@ -133,6 +133,40 @@ TEST_F(CircuitTest, RetryAfterOfAnAttemptFromBeforeItOpenedCounts) {
   EXPECT_FALSE(circuit.CanAdmit(now + seconds(100)));
 }
 
+TEST_F(CircuitTest, UnclearProbeLetsAnotherOneProbeAtOnce) {
+  FailTimes(3);
+  now += seconds(2);
+  ASSERT_TRUE(circuit.Admit(now));
+  circuit.OnUnclear(now, milliseconds(0), 0.0);
+  EXPECT_EQ(circuit.State(), CircuitState::kOpen);
+  EXPECT_TRUE(circuit.Admit(now));
+}
+
+TEST_F(CircuitTest, UnclearAttemptDoesNotCount) {
+  FailTimes(2);
+  circuit.OnUnclear(now, milliseconds(0), 0.0);
+  EXPECT_EQ(circuit.State(), CircuitState::kClosed);
+  EXPECT_TRUE(circuit.CanAdmit(now));
+  FailTimes(1);
+  EXPECT_EQ(circuit.RetryAt(), now + seconds(2));
+  // An attempt from before the circuit opened.
+  circuit.OnUnclear(now + seconds(1), milliseconds(0), 0.0);
+  EXPECT_EQ(circuit.State(), CircuitState::kOpen);
+  EXPECT_EQ(circuit.RetryAt(), now + seconds(2));
+}
+
+TEST_F(CircuitTest, RetryAfterOfAnUnclearAttemptHoldsAsThatOfAFailure) {
+  FailTimes(1);
+  circuit.OnUnclear(now, seconds(10), 0.0);
+  EXPECT_EQ(circuit.State(), CircuitState::kClosed);
+  EXPECT_FALSE(circuit.Admit(now + milliseconds(10999)));
+  EXPECT_TRUE(circuit.Admit(now + seconds(11)));
+  Circuit other{Config()};
+  other.OnFailure(now, milliseconds(0), 0.0);
+  other.OnFailure(now, seconds(10), 0.0);
+  EXPECT_EQ(other.RetryAt(), circuit.RetryAt());
+}
+
 }  // namespace
 
 }  // namespace SsoClient::Access

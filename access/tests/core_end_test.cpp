@@ -79,9 +79,13 @@ TEST_F(CoreEndTest, LastReferenceMayBeReleasedInACallback) {
 }
 
 // Work runs on another thread, and has ended before `Run` returns: it is faster than the caller.
-// What follows from it runs on the same thread.
+// What follows from it runs on the same thread. Whoever calls `Run` uses the core again, so that it
+// must not be gone: as long as it exists, so does its configuration.
 class ImmediateRuntime final : public Runtime {
  public:
+  explicit ImmediateRuntime(std::weak_ptr<const TokenSourceConfig> config)
+      : config_(std::move(config)) {}
+
   Instant Now() const override { return virtual_->Now(); }
   double Draw() override { return virtual_->Draw(); }
   void Run(std::function<void()> work) override {
@@ -96,6 +100,7 @@ class ImmediateRuntime final : public Runtime {
       work = nullptr;
     });
     worker.join();
+    EXPECT_FALSE(config_.expired()) << "The core was destroyed in a call.";
   }
   Tarnik::Ref<Tarnik::System::CancellableItem> RunAt(Instant::Steady time,
                                                      std::function<void()> action) override {
@@ -103,6 +108,7 @@ class ImmediateRuntime final : public Runtime {
   }
 
  private:
+  const std::weak_ptr<const TokenSourceConfig> config_;
   const std::shared_ptr<VirtualRuntime> virtual_ = std::make_shared<VirtualRuntime>();
 };
 
@@ -112,12 +118,17 @@ class FastWorkerTest : public CoreEndTest {
 
   std::unique_ptr<TokenSource> MakeFast() {
     const auto shared = std::make_shared<const TokenSourceConfig>(config);
+    left_ = shared;
     return std::make_unique<TokenSourceImpl>([shared, scripts = scripts] {
-      Core::Parts parts{shared, std::make_shared<ImmediateRuntime>(), {}};
+      Core::Parts parts{shared, std::make_shared<ImmediateRuntime>(shared), {}};
       parts.clients.push_back(std::make_unique<ScriptedEndpoint>(shared->endpoints[0], scripts[0]));
       return parts;
     });
   }
+  bool IsCoreGone() const { return left_.expired(); }
+
+ private:
+  std::weak_ptr<const TokenSourceConfig> left_;
 };
 
 TEST_F(FastWorkerTest, LastReferenceMayBeReleasedBeforeTheCallReturns) {
@@ -134,6 +145,7 @@ TEST_F(FastWorkerTest, LastReferenceMayBeReleasedBeforeTheCallReturns) {
   });
   EXPECT_EQ(calls, 1);
   EXPECT_EQ(last, nullptr);
+  EXPECT_TRUE(IsCoreGone());
 }
 
 TEST_F(FastWorkerTest, LastReferenceMayBeReleasedInACallbackOfStop) {
@@ -149,6 +161,7 @@ TEST_F(FastWorkerTest, LastReferenceMayBeReleasedInACallbackOfStop) {
   TokenSource* const raw = last.get();
   raw->Stop(milliseconds(0));
   EXPECT_EQ(calls, 1);
+  EXPECT_TRUE(IsCoreGone());
 }
 
 TEST_F(FastWorkerTest, CancelMayReleaseItsSourceInTheCallback) {
@@ -173,6 +186,27 @@ TEST_F(FastWorkerTest, CancelMayReleaseItsSourceInTheCallback) {
                        ++calls;
                      });
   EXPECT_EQ(calls, 1);
+  EXPECT_TRUE(IsCoreGone());
+}
+
+// A factory of the program may attach a function to the end of a token.
+TEST_F(FastWorkerTest, InvalidatedTokenMayUseAndReleaseItsSource) {
+  std::unique_ptr<TokenSource> last = MakeFast();
+  const auto token = NewToken(hours(1));
+  int ends = 0;
+  const auto onEnd = [&](const SamlToken*) {
+    EXPECT_EQ(last->Metrics().keys, 0U);
+    last.reset();
+    EXPECT_FALSE(IsCoreGone());
+    ++ends;
+  };
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) { return Issued({token.get(), onEnd}); });
+  TokenSource* const raw = last.get();
+  EXPECT_EQ(raw->GetToken(spec, {}).get(), token.get());
+  EXPECT_EQ(ends, 0);
+  raw->Invalidate(*token);
+  EXPECT_EQ(ends, 1);
+  EXPECT_TRUE(IsCoreGone());
 }
 
 TEST_F(CoreEndTest, CallbackNeverRunsInItsOwnCall) {

@@ -117,6 +117,30 @@ TEST_F(EndpointSetTest, ProbeChangesTheCircuit) {
   EXPECT_FALSE(set.OnAnswer(0));
 }
 
+TEST_F(EndpointSetTest, UnclearFailureChangesNoOrderAndIsTheReason) {
+  const Reason reason = MakeReason(FailureKind::kHttpStatus, "503");
+  EXPECT_FALSE(set.OnUnclear(0, reason, seconds(10), now, 0.5));
+  EXPECT_EQ(Order(), (Urls{"https://b", "https://c"}));
+  EXPECT_EQ(set.WhyLeftOut(0, now),
+            "left out for another 11 s; it failed before: http-status: 503");
+  now += milliseconds(10750);
+  EXPECT_EQ(Order(), (Urls{"https://a", "https://b", "https://c"}));
+}
+
+TEST_F(EndpointSetTest, UnclearProbeOpensTheCircuit) {
+  FailOnce(0);
+  FailOnce(0);
+  now += milliseconds(1500);
+  set.Begin(0, now);
+  const Reason reason = MakeReason(FailureKind::kHttpStatus, "503");
+  const auto opened = set.OnUnclear(0, reason, milliseconds(0), now, 0.5);
+  ASSERT_TRUE(opened);
+  EXPECT_EQ(opened->endpoint, 0U);
+  EXPECT_EQ(opened->state, CircuitState::kOpen);
+  EXPECT_EQ(opened->retryAfter, milliseconds(0));
+  EXPECT_TRUE(set.CanAdmit(0, now));
+}
+
 TEST_F(EndpointSetTest, AbandonedAfterTheDeadlinesOfAllPrefersTheNext) {
   set.OnAbandoned(0);
   EXPECT_EQ(Order()[0], "https://a");

@@ -22,6 +22,9 @@ RequestPtr MakeRequest() {
 
 class LoginGateTest : public ::testing::Test {
  protected:
+  LoginGateTest() = default;
+  explicit LoginGateTest(const RetryConfig& config) : gate(config, true) {}
+
   Turns Leave(const RequestPtr& request, LoginVerdict verdict) {
     Turns turns;
     LoginOutcome outcome;
@@ -113,6 +116,46 @@ TEST_F(LoginGateTest, UnknownVerdictClosesTheGateForAGrowingPause) {
   gate.Enter(1, b, now);
   Leave(b, LoginVerdict::kUnknown);
   EXPECT_EQ(gate.ClosedUntil(1) - now, milliseconds(250));
+}
+
+TEST_F(LoginGateTest, PausesNoLongerGrowAfterTwiceTheLongestOne) {
+  gate.Enter(1, a, now);
+  Leave(a, LoginVerdict::kUnknown);
+  const auto longest = RetryConfig().longestDelay;
+  for (const auto& [passed, pause] : {std::pair(2 * longest - milliseconds(1), milliseconds(500)),
+                                      std::pair(2 * longest, milliseconds(250))}) {
+    now = gate.ClosedUntil(1) + passed;
+    gate.Enter(2, c, now);  // which forgets what is idle
+    Withdraw(c);
+    gate.Enter(1, a, now);
+    Leave(a, LoginVerdict::kUnknown);
+    EXPECT_EQ(gate.ClosedUntil(1) - now, pause);
+  }
+}
+
+// Refusals are forgotten at once.
+class ForgetfulGateTest : public LoginGateTest {
+ protected:
+  ForgetfulGateTest() : LoginGateTest(Forgetful()) {}
+
+ private:
+  static RetryConfig Forgetful() {
+    RetryConfig config;
+    config.refusalMemory = seconds(0);
+    return config;
+  }
+};
+
+TEST_F(ForgetfulGateTest, VerdictEndsTheGrowthOfThePauses) {
+  gate.Enter(1, a, now);
+  for (const LoginVerdict verdict : {LoginVerdict::kRefused, LoginVerdict::kAccepted}) {
+    Leave(a, LoginVerdict::kUnknown);
+    EXPECT_EQ(gate.ClosedUntil(1) - now, milliseconds(250));
+    now = gate.ClosedUntil(1);
+    Leave(a, verdict);
+    now += seconds(10);
+    gate.Enter(1, a, now);
+  }
 }
 
 TEST_F(LoginGateTest, UnknownVerdictOfAnAcceptedSecretMakesTheNextLoginTheOnlyOne) {

@@ -11,6 +11,8 @@
 #include <tarnik/text/display_text.h>
 #include <tarnik/xml/xml_parse_exception.h>
 
+#include "gate/tolerant_token.h"
+
 namespace SsoClient::Access {
 
 namespace {
@@ -77,7 +79,7 @@ std::shared_ptr<CheckedToken> ReadToken(const std::string& text,
   }
   auto checked = std::make_shared<CheckedToken>();
   checked->traits = TraitsOf(*token, *config);
-  checked->token = std::move(token);
+  checked->token = WithTolerance(std::move(token), config->clockTolerance);
   checked->config = config;
   checked->readAt = now;
   return checked;

@@ -1,5 +1,6 @@
 // Logins that are refused reach one service once.
 #include <atomic>
+#include <chrono>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -109,6 +110,26 @@ TEST_F(AccountAsyncTest, AChangedPasswordIsUsedAtOnce) {
   EXPECT_TRUE(Get(*source, SpecFor(1)).Is<InvalidCredentialsException>());
   EXPECT_EQ(Get(*source, SpecFor(0)).token, result.token);
   EXPECT_EQ(Requests(), 2U);
+}
+
+TEST_F(AccountAsyncTest, TheLongestDurationsOfAConfigurationWork) {
+  TokenSourceConfig config = ConfigFor({&first_});
+  config.login = PasswordLogin{kUser, [vault = vault_] { return vault->Get(); }};
+  config.refresh.longestMargin = std::chrono::seconds::max();
+  config.retry.firstDelay = std::chrono::milliseconds::max();
+  config.retry.longestDelay = std::chrono::milliseconds::max();
+  config.retry.longestRetryAfter = std::chrono::milliseconds::max();
+  config.retry.refusalMemory = std::chrono::seconds::max();
+  const auto source = Make(config);
+  vault_->Set(kPassword);
+  const Result result = Get(*source, SpecFor(0));
+  ASSERT_NE(result.token, nullptr) << result.message;
+  vault_->Set("wrong");
+  for (std::size_t i = 1; i < 4; ++i) {
+    EXPECT_TRUE(Get(*source, SpecFor(i)).Is<InvalidCredentialsException>());
+  }
+  EXPECT_EQ(Requests(), 2U);
+  EXPECT_EQ(Get(*source, SpecFor(0)).token, result.token);
 }
 
 TEST_F(AccountAsyncTest, AFailureBeforeTheLoginIsJudgedCountsForNothing) {

@@ -5,6 +5,7 @@
 #include <memory>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include <gmock/gmock.h>
@@ -137,12 +138,14 @@ TEST_F(StopAsyncTest, RefreshesUnderWayEnd) {
 
 TEST_F(StopAsyncTest, TheDestructorDoesNotWaitForAFunctionThatBlocks) {
   const auto gate = std::make_shared<Gate>();
+  auto kept = std::make_shared<int>(0);
+  const std::weak_ptr<int> left = kept;
   TokenSourceConfig config = ConfigFor({&sts_});
-  config.login = PasswordLogin{kUser, [gate] {
+  config.login = PasswordLogin{kUser, [gate, kept = std::exchange(kept, nullptr)] {
                                  gate->Pass();
                                  return std::string(kPassword);
                                }};
-  source_ = Make(config);
+  source_ = Make(std::move(config));
   calls_.Begin(*source_, SpecFor(0));
   ASSERT_TRUE(gate->Await(1));
   auto destroyed = std::async(std::launch::async, [this] { source_.reset(); });
@@ -150,7 +153,15 @@ TEST_F(StopAsyncTest, TheDestructorDoesNotWaitForAFunctionThatBlocks) {
   const Result result = calls_.Wait().front();
   EXPECT_TRUE(result.Is<Tarnik::InvalidStateException>()) << result.type;
   EXPECT_EQ(result.reports, 1);
+  EXPECT_FALSE(left.expired());
+  // The password is not sent, and nothing remains.
   gate->Open();
+  const auto limit = Clock::now() + 1min;
+  while (!left.expired() && Clock::now() < limit) {
+    std::this_thread::yield();
+  }
+  EXPECT_TRUE(left.expired());
+  EXPECT_EQ(sts_.GetCounters().connectionsAccepted, 0U);
 }
 
 // Their code may be that of a plug-in, which is unloaded next.

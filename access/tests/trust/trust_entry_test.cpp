@@ -46,6 +46,23 @@ TEST_F(TrustEntryTest, WithoutPathsRevocationIsNotChecked) {
   EXPECT_FALSE(First().listUntil);
 }
 
+TEST_F(TrustEntryTest, CertificateWhoseKeyCannotBeUsedIsAnError) {
+  const auto certificate = Sts(0).ToCertificate();
+  std::string der(reinterpret_cast<const char*>(certificate->DerBytes()), certificate->DerLength());
+  Put("trust/a.pem", der);
+  Make();
+  EXPECT_EQ(Signers(), Names{"CN=sts-0"});
+  // id-ecPublicKey (RFC 5480, section 2.1.1) becomes an identifier that nobody knows.
+  const std::size_t place = der.find("\x2a\x86\x48\xce\x3d\x02\x01");
+  ASSERT_NE(place, std::string::npos);
+  der[place + 6] = '\x7f';
+  Put("trust/a.pem", der);
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] {
+              store->Reload();
+            })).rfind("The trust file '/trust/a.pem' cannot be used: ", 0),
+            0U);
+}
+
 TEST_F(TrustEntryTest, FolderWithoutAListLeavesRevocationUnknown) {
   Make();
   EXPECT_TRUE(First().isRevocationChecked);

@@ -1,6 +1,8 @@
 #include "trust/trust_files.h"
 
+#include <cstdint>
 #include <filesystem>
+#include <fstream>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -33,6 +35,12 @@ class TrustFilesTest : public TrustFixture {
 
   std::string Refusal() const {
     return WithoutRoot(MessageOf<IOException>([this] { Read(); }));
+  }
+
+  std::int64_t ChangeTimeOf(const std::string& name) const {
+    struct stat found {};
+    stat(PathOf(name).c_str(), &found);
+    return static_cast<std::int64_t>(found.st_ctim.tv_sec) * 1'000'000'000 + found.st_ctim.tv_nsec;
   }
 
   static constexpr std::size_t kLargest = kLargestTrustFile;
@@ -128,6 +136,18 @@ TEST_F(TrustFilesTest, ListingsDifferWhenAnythingHasChanged) {
   const TrustListing replaced = ListFiles(config.issuers);
   chmod(PathOf("trust/a.pem").c_str(), 0640);
   EXPECT_NE(ListFiles(config.issuers), replaced);
+}
+
+TEST_F(TrustFilesTest, TimeThatIsSetBackDoesNotHideAChange) {
+  Put("trust/a.pem", "a");
+  const TrustListing before = ListFiles(config.issuers);
+  const auto time = std::filesystem::last_write_time(PathOf("trust/a.pem"));
+  // Until the file system's clock has advanced.
+  do {
+    std::ofstream(PathOf("trust/a.pem")) << "b";
+    std::filesystem::last_write_time(PathOf("trust/a.pem"), time);
+  } while (ChangeTimeOf("trust/a.pem") == before.entries[0].certificates[0].files[0].changed);
+  EXPECT_NE(ListFiles(config.issuers), before);
 }
 
 TEST_F(TrustFilesTest, FilesThatDoNotCountDoNotChangeTheListing) {

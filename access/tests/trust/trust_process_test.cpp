@@ -1,8 +1,10 @@
+#include <atomic>
 #include <chrono>
 #include <cstdlib>
 #include <functional>
 #include <memory>
 #include <thread>
+#include <vector>
 
 #include <gtest/gtest.h>
 #include <unistd.h>
@@ -78,6 +80,34 @@ TEST_F(TrustProcessTest, ChildReloadsWhileItsParentDoes) {
   Put("trust/a.pem", Sts(1).Pem());
   store->Reload();
   EXPECT_TRUE(forking->isRight);
+}
+
+TEST_F(TrustProcessTest, ChildIsForkedWhileThreadsUseTheStore) {
+  config.isWatching = false;
+  Make();
+  std::atomic<bool> isDone{false};
+  std::vector<std::thread> threads;
+  for (int i = 0; i < 3; ++i) {
+    threads.emplace_back([&] {
+      while (!isDone) {
+        store->Current();
+      }
+    });
+  }
+  int failures = 0;
+  for (int i = 0; i < 200 && failures == 0; ++i) {
+    const pid_t child = fork();
+    if (child == 0) {
+      alarm(10);
+      _exit(store->Current()->Version() == store->Version() ? 0 : 1);
+    }
+    failures += Tarnik::Testing::HasSucceeded(child) ? 0 : 1;
+  }
+  isDone = true;
+  for (std::thread& thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(failures, 0);
 }
 
 TEST_F(TrustProcessTest, ChildMayDestroyTheStore) {

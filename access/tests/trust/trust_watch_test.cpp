@@ -2,9 +2,13 @@
 
 #include <filesystem>
 #include <fstream>
+#include <functional>
+#include <memory>
 #include <string>
+#include <utility>
 
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 
 #include <tarnik/core/exception.h>
@@ -107,9 +111,7 @@ TEST_F(TrustWatchTest, FilesThatStayTheSameAreNotRead) {
 }
 
 TEST_F(TrustWatchTest, ChangeWithoutTraceAfterTheFirstReadingIsSeen) {
-  // As within the resolution of the file system's clock: same size, same times.
-  const std::string path = PathOf("trust/a.pem");
-  Put("trust/a.pem", Sts(0).Pem());
+  // A change within the resolution of the file system's clock has the same size and times.
   Make();
   const auto loadedAt = store->Describe().loadedAt;
   Look();
@@ -276,6 +278,59 @@ TEST_F(TrustWatchTest, LookWithoutAWorkerIsMadeLater) {
   runtime->Advance(std::chrono::seconds(10));
   EXPECT_EQ(Signers(), Names{"CN=sts-0"});
   runtime->RefuseWork(false);
+  Wait();
+  EXPECT_EQ(Signers(), (Names{"CN=sts-0", "CN=sts-1"}));
+}
+
+TEST_F(TrustWatchTest, ShortageIsReportedOnceAndPassesWithoutAChange) {
+  config.issuers[0].certificatePaths = {PathOf("trust/a.pem")};
+  MakeSettled();
+  Put("trust/a.pem", Sts(1).Pem());
+  rlimit before{};
+  getrlimit(RLIMIT_NOFILE, &before);
+  rlimit none = before;
+  none.rlim_cur = 0;
+  setrlimit(RLIMIT_NOFILE, &none);
+  runtime->Advance(std::chrono::seconds(10));
+  setrlimit(RLIMIT_NOFILE, &before);
+  EXPECT_EQ(Failure(), "The trust file '/trust/a.pem' cannot be read: Too many open files.");
+  EXPECT_EQ(listener->kept.size(), 1U);
+  EXPECT_EQ(Signers(), Names{"CN=sts-0"});
+  Wait();
+  EXPECT_EQ(Signers(), Names{"CN=sts-1"});
+  EXPECT_EQ(Failure(), "");
+}
+
+TEST_F(TrustWatchTest, WithoutATimerTheNextUseTriesAgain) {
+  struct WithoutTimers final : Runtime {
+    Instant Now() const override { return runtime->Now(); }
+    double Draw() override { return runtime->Draw(); }
+    void Run(std::function<void()> work) override { runtime->Run(std::move(work)); }
+    Tarnik::Ref<Tarnik::System::CancellableItem> RunAt(Instant::Steady time,
+                                                       std::function<void()> action) override {
+      if (isShort) {
+        throw Tarnik::ResourceException("No thread.");
+      }
+      return runtime->RunAt(time, std::move(action));
+    }
+    std::shared_ptr<VirtualRuntime> runtime;
+    bool isShort = true;
+  };
+  const auto shortRuntime = std::make_shared<WithoutTimers>();
+  shortRuntime->runtime = runtime;
+  store = CreateTrustStore(config, shortRuntime);
+  EXPECT_EQ(runtime->TimersArmed(), 0U);
+  shortRuntime->isShort = false;
+  store->Version();
+  EXPECT_EQ(runtime->TimersArmed(), 1U);
+  // A shortage at the end of a look.
+  runtime->Pass(kLook);
+  shortRuntime->isShort = true;
+  runtime->Settle();
+  EXPECT_EQ(runtime->TimersArmed(), 0U);
+  shortRuntime->isShort = false;
+  Put("trust/b.pem", Sts(1).Pem());
+  store->Current();
   Wait();
   EXPECT_EQ(Signers(), (Names{"CN=sts-0", "CN=sts-1"}));
 }

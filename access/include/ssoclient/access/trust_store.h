@@ -19,8 +19,10 @@ namespace SsoClient::Access {
 ///
 /// Paths are those of files and folders. Of a folder, the files directly in it count whose names
 /// end in ".pem", ".crt" or ".cer", for lists also ".crl", and do not begin with a dot. Symbolic
-/// links are followed. A file contains PEM blocks (RFC 7468) or one DER encoding; blocks of other
-/// kinds, such as private keys, are skipped.
+/// links are followed. A file contains PEM blocks (RFC 7468) or one DER encoding, in at most 16
+/// MiB; blocks of other kinds, such as private keys, are skipped. Pipes, devices and, within a
+/// folder, other folders are errors where a file is expected. Relative paths are resolved when the
+/// store is created.
 struct TrustedIssuer {
   /// The text of the tokens' Issuer (SAML 2.0 core, section 2.2.5), compared byte for byte. Several
   /// entries for one issuer are used together.
@@ -34,7 +36,10 @@ struct TrustedIssuer {
   std::vector<std::string> certificatePaths{};
   /// Certificate revocation lists (RFC 5280, section 5). Without paths, revocation is not checked.
   /// With them, each of the certificates must be covered by a list of its issuer that is not out of
-  /// date, or no token that it signed is accepted: also when a folder contains no list yet.
+  /// date, or no token that it signed is accepted: also when a folder contains no list yet. Of
+  /// several lists that cover a certificate, the one with the latest thisUpdate counts, and all of
+  /// them if they have the same. A certificate in several entries of an issuer is checked if one of
+  /// them has lists, against the lists of all.
   std::vector<std::string> revocationListPaths{};
   /// The certificates of the authorities that sign these lists. They are not trusted to sign
   /// tokens. A list that none of them, and none of the certificates above, has signed is an error.
@@ -56,7 +61,7 @@ struct TrustedSigner {
 /// The trust in use, and the last attempt to read it.
 struct TrustDescription {
   std::vector<TrustedSigner> signers{};
-  Tarnik::System::DateTime loadedAt{};  ///< when this trust was read
+  Tarnik::System::DateTime loadedAt{};  ///< when the files were last read successfully
   /// Why the files as they are now were not accepted; empty if the trust in use is that of the
   /// files, as far as they have been looked at.
   std::string failure{};
@@ -75,13 +80,15 @@ struct TrustRecord {
 };
 
 /// Sees what a trust store does. The functions run on a worker thread of the platform, or on the
-/// one that calls `TrustStore::Reload`, one at a time for each store, and must not call `Reload`.
-/// Exceptions that leave them are ignored. None is called after the destructor of the store has
-/// returned, unless that was called by the listener itself.
+/// one that calls `TrustStore::Reload`, one at a time for each store. They must not call `Reload`
+/// of their store, but may release it. Exceptions that leave them are ignored. None is called after
+/// the destructor of the store has returned, which waits up to a second for one that runs on
+/// another thread.
 class SSOCLIENT_ACCESS_EXPORT TrustListener {
  public:
   virtual ~TrustListener();
-  /// The trust has been replaced. Does nothing unless it is overridden, as does the next function.
+  /// The trust has been replaced; or, after a failure, the files can be read again, even if the
+  /// trust is what it was. Does nothing unless it is overridden, as does the next function.
   virtual void OnTrustReplaced(const TrustRecord& record);
   /// The files could not be read or decoded, and the trust stays as it was. Called once for each
   /// new failure, not again while the files stay as they are.
@@ -122,16 +129,20 @@ class SSOCLIENT_ACCESS_EXPORT TrustStore {
   virtual ~TrustStore();
   /// Reads all files now, on this thread. When it returns, the trust is that of the files. Throws
   /// what `CreateTrustStore` throws for files; the trust then stays as it was, and the listener has
-  /// been called, unless it knows this failure already.
+  /// been called, unless it knows this failure already. Throws `Tarnik::InvalidStateException` in a
+  /// function of the store's listener.
   virtual void Reload() = 0;
   virtual TrustDescription Describe() const = 0;
 };
 
 /// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no issuer, an issuer
 /// has neither a certificate nor a path of one, a certificate is null, and when there is no
-/// certificate at all, since a gate would refuse every token; `Tarnik::IOException` when a path
-/// does not exist or cannot be read; `Tarnik::Crypto::CryptoException` when a file contains no
-/// certificate or list, or one that cannot be used. The message names the file.
+/// certificate at all, since a gate would refuse every token, when there are signers of lists but
+/// no path of a list, and when a path is empty or contains a NUL; `Tarnik::IOException` when a path
+/// does not exist or cannot be read, or the files change during each of several readings;
+/// `Tarnik::Crypto::CryptoException` when a file contains no certificate or list, or one that
+/// cannot be used; `Tarnik::ResourceException` when the system has too few descriptors. A message
+/// about a file names it.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustStore> CreateTrustStore(TrustStoreConfig config);
 
 }  // namespace SsoClient::Access
