@@ -52,7 +52,7 @@ asio::awaitable<void> Connection::Serve() {
   } catch (const beast::system_error&) {
     // The client closed the connection, was too slow or does not speak TLS, or the server stops.
   } catch (const std::exception& e) {
-    std::cerr << "connection of " + sender_ + ": " + e.what() + '\n';
+    std::cerr << sender_ + ": " + e.what() + '\n';
   }
 }
 

@@ -26,7 +26,7 @@ Response Challenge(const Request& request, http::status status, const char* chal
 
 /// The answer does not say what this service trusts; the log does.
 Response Refuse(const Request& request, const Verdict& verdict, const std::string& sender) {
-  std::cerr << "refused " + sender + '\n' + verdict.ToString();
+  std::cerr << sender + ": " + verdict.ToString();
   switch (RemedyOf(verdict.Refusal())) {
     case Remedy::kAccess:
       return MakeResponse(request, http::status::forbidden, "");
@@ -52,7 +52,7 @@ Response Guard::Answer(const Request& request, const SsoClient::Access::Presente
   const auto& subject = verdict.Token()->Subject();
   return MakeResponse(request, http::status::ok, subject.name + '@' + subject.domain + '\n');
 } catch (const MalformedRequest& e) {
-  std::cerr << "malformed request from " + sender + ": " + e.what() + '\n';
+  std::cerr << sender + ": malformed request: " + e.what() + '\n';
   return Challenge(request, http::status::bad_request, "Bearer error=\"invalid_request\"");
 }
 
