@@ -120,6 +120,15 @@ TEST_F(TrustWatchTest, ChangeWithoutTraceAfterTheFirstReadingIsSeen) {
   EXPECT_NE(store->Describe().loadedAt, loadedAt);
 }
 
+TEST_F(TrustWatchTest, ChangeWithoutTraceAfterAReloadIsSeen) {
+  MakeSettled();
+  store->Reload();
+  const auto loadedAt = store->Describe().loadedAt;
+  Look();
+  Look();
+  EXPECT_NE(store->Describe().loadedAt, loadedAt);
+}
+
 TEST_F(TrustWatchTest, TouchedFileReplacesNothing) {
   MakeSettled();
   const auto before = store->Version();
