@@ -111,9 +111,10 @@ class Core : public std::enable_shared_from_this<Core> {
                     std::chrono::microseconds granted) noexcept;
 
   // steps of requests: request_steps.cpp
-  void StartWork(const RequestPtr& request) noexcept;
   void Run(const RequestPtr& request);
   void FailHere(const RequestPtr& request, const Failure& failure) noexcept;
+  void FailUnlessEnded(Section& section, const RequestPtr& request,
+                       const Failure& failure) noexcept;
   void Work(const RequestPtr& request) noexcept;
   bool RunStep(const RequestPtr& request);
   bool Begin(const RequestPtr& request, Step& step);

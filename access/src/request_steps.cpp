@@ -67,16 +67,13 @@ void Core::Run(const RequestPtr& request) {
   runtime_->Run([self = shared_from_this(), request] { self->Work(request); });
 }
 
-void Core::StartWork(const RequestPtr& request) noexcept {
-  try {
-    Run(request);
-  } catch (...) {
-    FailHere(request, Failure::Current());
-  }
-}
-
 void Core::FailHere(const RequestPtr& request, const Failure& failure) noexcept {
   Section section(*this);
+  FailUnlessEnded(section, request, failure);
+}
+
+void Core::FailUnlessEnded(Section& section, const RequestPtr& request,
+                           const Failure& failure) noexcept {
   if (!request->hasEnded) {
     Fail(section, request, failure, runtime_->Now());
   }

@@ -19,6 +19,18 @@ void CancelUnlessNull(const Tarnik::Ref<Item>& item) noexcept {
   }
 }
 
+// Takes the first element of a list through the objects themselves.
+template <class Object>
+std::shared_ptr<Object> TakeFirst(std::shared_ptr<Object>& first, Object*& last,
+                                  std::shared_ptr<Object> Object::*next) noexcept {
+  std::shared_ptr<Object> taken = std::move(first);
+  first = std::exchange(taken.get()->*next, nullptr);
+  if (first == nullptr) {
+    last = nullptr;
+  }
+  return taken;
+}
+
 }  // namespace
 
 void Section::Circuit(const EndpointSet::Change& change) noexcept {
@@ -57,14 +69,15 @@ void Section::Finish() noexcept {
   lock_.unlock();
   AnswerAll();
   CancelEnded();
-  RunStarted();
+  while (firstStarted_ != nullptr) {
+    RunOrFail(TakeFirst(firstStarted_, lastStarted_, &Request::nextStarted));
+  }
   ReportAll();
 }
 
 void Section::AnswerAll() noexcept {
   while (firstAnswered_ != nullptr) {
-    const WaiterPtr waiter = std::exchange(firstAnswered_, nullptr);
-    firstAnswered_ = std::exchange(waiter->nextAnswered, nullptr);
+    const WaiterPtr waiter = TakeFirst(firstAnswered_, lastAnswered_, &Waiter::nextAnswered);
     const auto timer = std::exchange(waiter->deadlineTimer, nullptr);
     waiter->Receive(std::move(waiter->dueAnswer));
     CancelUnlessNull(timer);
@@ -74,24 +87,29 @@ void Section::AnswerAll() noexcept {
 void Section::CancelEnded() noexcept {
   const bool hasBase = std::holds_alternative<TokenLogin>(core_.config_->login);
   while (firstEnded_ != nullptr) {
-    const RequestPtr request = std::exchange(firstEnded_, nullptr);
-    firstEnded_ = std::exchange(request->nextEnded, nullptr);
+    const RequestPtr request = TakeFirst(firstEnded_, lastEnded_, &Request::nextEnded);
     CancelUnlessNull(std::exchange(request->endedLimit, nullptr));
     CancelUnlessNull(std::exchange(request->endedPause, nullptr));
     if (hasBase) {
       request->cancellation.Cancel();
     }
   }
-  for (const auto& item : items_) {
+  for (const auto& item : std::exchange(items_, {})) {
     CancelUnlessNull(item);
   }
 }
 
-void Section::RunStarted() noexcept {
-  while (firstStarted_ != nullptr) {
-    const RequestPtr request = std::exchange(firstStarted_, nullptr);
-    firstStarted_ = std::exchange(request->nextStarted, nullptr);
-    core_.StartWork(request);
+// The end of a request may start the next one, which fails in the same way: all of them do so here,
+// one after the other, whatever their number.
+void Section::RunOrFail(const RequestPtr& request) noexcept {
+  try {
+    core_.Run(request);
+  } catch (...) {
+    lock_.lock();
+    core_.FailUnlessEnded(*this, request, Failure::Current());
+    lock_.unlock();
+    AnswerAll();
+    CancelEnded();
   }
 }
 

@@ -80,7 +80,7 @@ class Section {
 
   void AnswerAll() noexcept;
   void CancelEnded() noexcept;
-  void RunStarted() noexcept;
+  void RunOrFail(const RequestPtr& request) noexcept;
   void ReportAll() noexcept;
 
   Core& core_;

@@ -1,4 +1,6 @@
+#include <algorithm>
 #include <atomic>
+#include <chrono>
 #include <functional>
 #include <future>
 #include <memory>
@@ -65,17 +67,25 @@ TEST_F(CoreEndTest, StopInACallbackDoesNotWaitForItself) {
   EXPECT_TRUE(wasIdle);
 }
 
-TEST_F(CoreEndTest, LastReferenceMayBeReleasedInACallback) {
-  Make();
-  int calls = 0;
-  auto* const raw = source.get();
-  auto last = std::make_shared<std::shared_ptr<TokenSourceImpl>>(std::move(source));
-  raw->GetTokenAsync(spec, {}, [last, &calls](const auto&, const Tarnik::Exception*) {
-    last->reset();
-    ++calls;
-  });
-  runtime->Settle();
-  EXPECT_EQ(calls, 1);
+TEST_F(CoreEndTest, LastReferenceMayBeReleasedInACallbackWhichIsNotWaitedFor) {
+  using Clock = std::chrono::steady_clock;
+  auto best = Clock::duration::max();
+  // The destructor waits for a second at most. Another program may delay a few rounds.
+  for (int round = 1; round <= 5 && best >= milliseconds(500); ++round) {
+    Make();
+    int calls = 0;
+    auto* const raw = source.get();
+    auto last = std::make_shared<std::shared_ptr<TokenSourceImpl>>(std::move(source));
+    raw->GetTokenAsync(spec, {}, [&, last](const auto&, const Tarnik::Exception*) {
+      const auto begun = Clock::now();
+      last->reset();
+      best = std::min(best, Clock::now() - begun);
+      ++calls;
+    });
+    runtime->Settle();
+    EXPECT_EQ(calls, 1);
+  }
+  EXPECT_LT(best, milliseconds(500));
 }
 
 // Work runs on another thread, and has ended before `Run` returns: it is faster than the caller.
@@ -240,11 +250,14 @@ TEST_F(CoreEndTest, StopReportsThatAFunctionIsStillRunning) {
                       other.join();
                       return password;
                     }};
+  // Nobody waits for this one, so that no callback is due.
+  config.keepFresh = {spec};
   Make();
-  const Reply reply = Get(spec);
+  runtime->Settle();
   EXPECT_FALSE(wasIdle);
-  EXPECT_TRUE(reply.Is<Tarnik::InvalidStateException>());
+  EXPECT_TRUE(source->Stop(milliseconds(0)));
   EXPECT_EQ(Attempts(), 0U);
+  EXPECT_TRUE(listener->Begun().empty());
 }
 
 TEST_F(CoreEndTest, ProcessEndEndsCallers) {

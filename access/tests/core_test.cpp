@@ -1,5 +1,8 @@
 #include "core.h"
 
+#include <cstdint>
+#include <set>
+
 #include <gtest/gtest.h>
 
 #include <ssoclient/exceptions.h>
@@ -387,6 +390,29 @@ TEST_F(CoreTest, CallbackRunsHereWhenNoWorkerIsLeftForIt) {
   const Reply reply = Get(spec);
   EXPECT_EQ(reply.calls, 1);
   EXPECT_NE(reply.token, nullptr);
+}
+
+TEST_F(CoreTest, RequestsThatFindNoWorkerFailOneAfterTheOther) {
+  UseCertificate();
+  Make();
+  scripts[0]->Set([&](const AttemptRequest&, Limit&) {
+    runtime->Settle();
+    runtime->RefuseWork(true);
+    return Fault();
+  });
+  // Each has waited at the gate for the one before. Their callbacks run on this thread.
+  std::set<std::uintptr_t> frames;
+  int calls = 0;
+  for (int i = 0; i < 500; ++i) {
+    source->GetTokenAsync(SpecFor(std::to_string(i)), {}, [&](const auto&, const auto*) {
+      ++calls;
+      frames.insert(reinterpret_cast<std::uintptr_t>(__builtin_frame_address(0)));
+    });
+  }
+  runtime->Settle();
+  runtime->RefuseWork(false);
+  EXPECT_EQ(calls, 500);
+  EXPECT_LT(*frames.rbegin() - *frames.begin(), 16384U);
 }
 
 TEST_F(CoreTest, BadCallsAreRefusedBeforeAnythingIsSent) {

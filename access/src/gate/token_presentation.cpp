@@ -84,8 +84,10 @@ CheckResult TokenPresentation::CheckAll(const std::string& text, const Presenter
 }
 
 std::shared_ptr<const CheckedToken> TokenPresentation::Recall(const Key& key) {
-  std::shared_ptr<const CheckedToken> known =
-      key ? remembered_.Find(*key, trust_.Version()) : nullptr;
+  if (!key) {
+    return nullptr;
+  }
+  std::shared_ptr<const CheckedToken> known = remembered_.Find(*key, trust_.Version());
   if (known == nullptr || CheckSignerAgain(*known->signer, clock_).reason == Reason::kNone) {
     return known;
   }
@@ -111,7 +113,7 @@ CheckResult TokenPresentation::Read(const std::string& text) {
 CheckResult TokenPresentation::CheckTrust(const Key& key) {
   const CheckedToken& checked = *facts_->checked;
   if (const Reason reason = CheckValidity(*checked.token, clock_); reason != Reason::kNone) {
-    if (facts_->isRemembered && reason == Reason::kExpired) {
+    if (key && facts_->isRemembered && reason == Reason::kExpired) {
       remembered_.Remove(*key, checked);
     }
     return {CheckKind::kValidity, reason};

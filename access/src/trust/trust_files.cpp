@@ -129,7 +129,9 @@ PathState LookAtPath(const std::string& path, Content content) {
   std::vector<std::string> names;
   state.target.error = ListNames(path, content, names);
   for (const std::string& name : names) {
-    state.files.push_back(Look(path + "/" + name));
+    std::string file = path;
+    file.append("/").append(name);
+    state.files.push_back(Look(file));
   }
   return state;
 }

@@ -76,6 +76,7 @@ TEST_F(GateFaultsTest, Ledger) {
     try {
       EXPECT_EQ(verdict.ToString(), expected);
     } catch (const std::bad_alloc&) {
+      EXPECT_TRUE(failure.HasHappened());
     }
     hasHappened = failure.HasHappened();
   }

@@ -105,11 +105,24 @@ TEST_F(TrustStoreConcurrentTest, ThreadsSeeOnlyWholeStates) {
     }
   };
   RunBeside(step, [&] {
-    for (int i = 1; i < 40; ++i) {
+    for (int i = 1; i < 20; ++i) {
       Switch(i % 2);
       store->Reload();
       EXPECT_EQ(Signers().front(), i % 2 == 0 ? "CN=sts-0" : "CN=sts-2");
     }
+    // The files of one reading must not be those of two states.
+    std::atomic<bool> isSwitching{true};
+    std::thread other([&] {
+      for (int i = 0; isSwitching; ++i) {
+        Switch(i % 2);
+      }
+    });
+    for (int i = 0; i < 100; ++i) {
+      ReloadIfItCan();
+    }
+    isSwitching = false;
+    other.join();
+    Switch(1);
     Put("state1/b.pem", "broken");
     EXPECT_TRUE(Await([&] { return !store->Describe().failure.empty(); }));
   });

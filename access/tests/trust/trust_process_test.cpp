@@ -95,7 +95,7 @@ TEST_F(TrustProcessTest, ChildIsForkedWhileThreadsUseTheStore) {
     });
   }
   int failures = 0;
-  for (int i = 0; i < 200 && failures == 0; ++i) {
+  for (int i = 0; i < 40 && failures == 0; ++i) {
     const pid_t child = fork();
     if (child == 0) {
       alarm(10);

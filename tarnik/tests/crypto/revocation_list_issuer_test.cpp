@@ -1,3 +1,4 @@
+#include <algorithm>
 #include <cstddef>
 #include <string>
 #include <vector>
@@ -145,6 +146,19 @@ TEST(RevocationListIssuerTest, SignedEveryByte) {
     }
   }
   EXPECT_GT(decoded, 300U);
+}
+
+// RFC 5280, section 5.1.1.2: the algorithm that is not signed is the one that is.
+TEST(RevocationListIssuerTest, NamedOneAlgorithm) {
+  auto der = MakeRevocationListDer();
+  // The parameters of the algorithm, followed by the signature.
+  const std::vector<unsigned char> end{0x05, 0x00, 0x03, 0x82};
+  const auto place = std::search(der.begin(), der.end(), end.begin(), end.end());
+  ASSERT_NE(place, der.end());
+  const auto issuer = MakeCertificate();
+  ASSERT_TRUE(CreateRevocationListFromDer(der.data(), der.size())->IsFrom(*issuer));
+  *place = 0x04;
+  EXPECT_FALSE(CreateRevocationListFromDer(der.data(), der.size())->IsFrom(*issuer));
 }
 
 TEST(RevocationListIssuerTest, CannotBeACertificateWithAnUnknownKey) {

@@ -114,7 +114,7 @@ class SSOCLIENT_ACCESS_EXPORT Verdict {
   /// have passed, or none has been reached. Throw `Tarnik::InvalidArgumentException` for null and
   /// for `Reason::kNone`.
   static Verdict Accept(std::shared_ptr<const SamlToken> token);
-  static Verdict Refuse(Reason reason, std::string message);
+  static Verdict Refuse(Reason reason, const std::string& message);
 
   /// For the library.
   explicit Verdict(std::shared_ptr<const VerdictFacts> facts) noexcept;
