@@ -308,6 +308,7 @@ TEST_F(GuardedServerTest, SurvivesGarbage) {
               HasSubstr("HTTP/1.1 431 "));
   EXPECT_THAT(SendText("POST / HTTP/1.1\r\nHost: a\r\nContent-Length: 9999999\r\n\r\n"),
               HasSubstr("HTTP/1.1 413 "));
+  EXPECT_THAT(SendText("HEAD / HTTP/1.1\r\nConnection: close\r\n\r\n"), HasSubstr("HTTP/1.1 405 "));
   EXPECT_THAT(SendText("GET / HTTP/1.1\r\nAuthorization: Bearer YQ\r\n"
                        "Authorization: Bearer YQ\r\nConnection: close\r\n\r\n"),
               HasSubstr("HTTP/1.1 400 "));
