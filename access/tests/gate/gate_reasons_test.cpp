@@ -221,13 +221,16 @@ TEST_F(GateReasonsTest, WrongSignatureOfData) {
   ExpectRefused(
       Check(HolderOfKeyText(), Signing("challenge", "challenge", OtherHolderCredential())),
       Reason::kWrongProof, CheckKind::kPossession);
+  // Of nothing that the server could have chosen.
+  ExpectRefused(Check(HolderOfKeyText(), Signing("", "", HolderCredential())), Reason::kWrongProof,
+                CheckKind::kPossession);
   // An algorithm that does not fit the key is an exception of the platform.
   const Verdict verdict =
       Check(HolderOfKeyText(),
             Presenter::WithSignature("challenge", {1, 2, 3}, SignatureAlgorithm::kRsaPssSha256));
   ExpectRefused(verdict, Reason::kWrongProof, CheckKind::kPossession);
-  ExpectRefused(Check(HolderOfKeyText(),
-                      Presenter::WithSignature("", {}, static_cast<SignatureAlgorithm>(99))),
+  ExpectRefused(Check(HolderOfKeyText(), Presenter::WithSignature(
+                                             "challenge", {}, static_cast<SignatureAlgorithm>(99))),
                 Reason::kWrongProof, CheckKind::kPossession);
 }
 

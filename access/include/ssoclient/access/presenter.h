@@ -30,7 +30,8 @@ class SSOCLIENT_ACCESS_EXPORT Presenter {
   /// The sender has sent `signature`, which is to be one of `data` by the token's key. The proof is
   /// worth what `data` is worth: it must contain something that the server chose for this exchange,
   /// such as a random challenge, and should contain the SHA-256 of the token, so that a signature
-  /// made for another exchange or another token with the same key does not fit.
+  /// made for another exchange or another token with the same key does not fit. Empty data proves
+  /// nothing.
   static Presenter WithSignature(std::string data, std::vector<unsigned char> signature,
                                  Tarnik::Crypto::SignatureAlgorithm algorithm);
 

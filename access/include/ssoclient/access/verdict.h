@@ -95,8 +95,7 @@ struct VerdictFacts;
 class SSOCLIENT_ACCESS_EXPORT Verdict {
  public:
   bool IsAccepted() const noexcept;
-  /// The accepted token; null when it was refused. The gate reads tokens with the widest clock
-  /// tolerance: their `ExpirationTimeWithTolerance` is of no use.
+  /// The accepted token, with the clock tolerance of the gate; null when it was refused.
   const std::shared_ptr<const SamlToken>& Token() const noexcept;
   /// `Reason::kNone` for an accepted token.
   Reason Refusal() const noexcept;
