@@ -92,6 +92,13 @@ std::string Identity::Pem() const {
   return TakeText(bio.get());
 }
 
+std::string Identity::KeyPem() const {
+  const OpenSsl::OwnedBio bio(BIO_new(BIO_s_mem()));
+  Require(PEM_write_bio_PrivateKey(bio.get(), key.get(), nullptr, nullptr, 0, nullptr, nullptr) ==
+          1);
+  return TakeText(bio.get());
+}
+
 Ref<const Crypto::Certificate> Identity::ToCertificate() const {
   unsigned char* der = nullptr;
   const int length = i2d_X509(certificate.get(), &der);
@@ -133,6 +140,23 @@ Identity MakeCa(const std::string& commonName, const Identity* issuer) {
   options.dnsNames = {};
   options.isCa = true;
   return MakeIdentity(options, issuer);
+}
+
+Identity MakeLookalike(const Identity& original) {
+  Identity made{OpenSsl::OwnedCertificate(X509_dup(original.certificate.get())),
+                OpenSsl::OwnedKey(MakeKey(0))};
+  Require(X509_set_pubkey(made.certificate.get(), made.key.get()) == 1);
+  Require(X509_sign(made.certificate.get(), made.key.get(), EVP_sha256()) > 0);
+  return made;
+}
+
+Identity MakeRenewed(const Identity& original, const Identity& issuer) {
+  Require(EVP_PKEY_up_ref(original.key.get()) == 1);
+  Identity made{OpenSsl::OwnedCertificate(X509_dup(original.certificate.get())),
+                OpenSsl::OwnedKey(original.key.get())};
+  SetSerialNumber(made.certificate.get());
+  Require(X509_sign(made.certificate.get(), issuer.key.get(), EVP_sha256()) > 0);
+  return made;
 }
 
 std::string MakeCrl(const Identity& issuer, const Identity* revoked, long nextUpdate,

@@ -17,6 +17,8 @@ struct Identity {
   OpenSsl::OwnedKey key;
 
   std::string Pem() const;
+  /// The private key, in PEM without encryption.
+  std::string KeyPem() const;
   /// As a certificate of the library.
   Ref<const Crypto::Certificate> ToCertificate() const;
 };
@@ -39,6 +41,11 @@ struct IdentityOptions {
 /// Issued by `issuer`, or self-signed if that is null.
 Identity MakeIdentity(const IdentityOptions& options, const Identity* issuer);
 Identity MakeCa(const std::string& commonName, const Identity* issuer = nullptr);
+/// Another key on P-256, with a certificate that has all names, numbers and identifiers of
+/// `original`; signed by itself.
+Identity MakeLookalike(const Identity& original);
+/// The key of `original` with another certificate that differs in its serial number.
+Identity MakeRenewed(const Identity& original, const Identity& issuer);
 
 /// A PEM revocation list of `issuer` that revokes `revoked`, or nothing if that is null.
 /// `nextUpdate` and `thisUpdate` are in seconds from `now`.
