@@ -95,7 +95,8 @@ struct VerdictFacts;
 class SSOCLIENT_ACCESS_EXPORT Verdict {
  public:
   bool IsAccepted() const noexcept;
-  /// The accepted token, with the clock tolerance of the gate; null when it was refused.
+  /// The accepted token; null when it was refused. Its `ExpirationTimeWithTolerance` has the
+  /// tolerance of the gate (`GateConfig::clockTolerance`).
   const std::shared_ptr<const SamlToken>& Token() const noexcept;
   /// `Reason::kNone` for an accepted token.
   Reason Refusal() const noexcept;
