@@ -26,6 +26,10 @@ void CheckPaths(const std::vector<std::string>& paths) {
 }
 
 void CheckIssuer(const TrustedIssuer& issuer) {
+  RequireTrust(!issuer.issuer.empty() || issuer.isForAnyIssuer,
+               "An issuer of the trust store has no name, and is not said to be for any issuer.");
+  RequireTrust(issuer.issuer.empty() || !issuer.isForAnyIssuer,
+               "An issuer of the trust store has a name, but is said to be for any issuer.");
   RequireTrust(!issuer.certificates.empty() || !issuer.certificatePaths.empty(),
                "An issuer of the trust store has neither a certificate nor a path of one.");
   RequireTrust(std::find(issuer.certificates.begin(), issuer.certificates.end(), nullptr) ==

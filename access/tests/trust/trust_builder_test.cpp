@@ -23,6 +23,7 @@ class TrustBuilderTest : public TrustFixture {
   static TrustedIssuer EntryOf(const std::string& issuer, std::vector<std::size_t> numbers) {
     TrustedIssuer entry;
     entry.issuer = issuer;
+    entry.isForAnyIssuer = issuer.empty();
     for (const std::size_t number : numbers) {
       entry.certificates.push_back(Sts(number).ToCertificate());
     }

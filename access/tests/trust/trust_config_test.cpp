@@ -31,8 +31,21 @@ TEST_F(TrustConfigTest, IssuersNeedACertificateOrThePathOfOne) {
 }
 
 TEST_F(TrustConfigTest, EveryIssuerIsChecked) {
-  config.issuers.emplace_back();
+  config.issuers.emplace_back().issuer = "https://other.example";
   EXPECT_EQ(Refusal(), "An issuer of the trust store has neither a certificate nor a path of one.");
+}
+
+// A name that was forgotten, or comes from an empty variable, must not trust everybody's tokens.
+TEST_F(TrustConfigTest, IssuersHaveANameUnlessTheyAreForAny) {
+  issuer.isForAnyIssuer = true;
+  EXPECT_EQ(Refusal(),
+            "An issuer of the trust store has a name, but is said to be for any issuer.");
+  issuer.issuer.clear();
+  EXPECT_EQ(Refusal(), "nothing");
+  issuer.isForAnyIssuer = false;
+  EXPECT_EQ(Refusal(),
+            "An issuer of the trust store has no name, and is not said to be for any issuer.");
+  EXPECT_THROW(Make(), Tarnik::InvalidArgumentException);
 }
 
 TEST_F(TrustConfigTest, CertificatesMustNotBeNull) {

@@ -135,14 +135,14 @@ class SSOCLIENT_ACCESS_EXPORT TrustStore {
   virtual TrustDescription Describe() const = 0;
 };
 
-/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no issuer, an issuer
-/// has neither a certificate nor a path of one, a certificate is null, and when there is no
-/// certificate at all, since a gate would refuse every token, when there are signers of lists but
-/// no path of a list, and when a path is empty or contains a NUL; `Tarnik::IOException` when a path
-/// does not exist or cannot be read, or the files change during each of several readings;
-/// `Tarnik::Crypto::CryptoException` when a file contains no certificate or list, or one that
-/// cannot be used; `Tarnik::ResourceException` when the system has too few descriptors. A message
-/// about a file names it.
+/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no issuer, one has
+/// either no name without `isForAnyIssuer` or a name with it, an issuer has neither a certificate
+/// nor a path of one, a certificate is null, and when there is no certificate at all, since a gate
+/// would refuse every token, when there are signers of lists but no path of a list, and when a path
+/// is empty or contains a NUL; `Tarnik::IOException` when a path does not exist or cannot be read,
+/// or the files change during each of several readings; `Tarnik::Crypto::CryptoException` when a
+/// file contains no certificate or list, or one that cannot be used; `Tarnik::ResourceException`
+/// when the system has too few descriptors. A message about a file names it.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustStore> CreateTrustStore(TrustStoreConfig config);
 
 }  // namespace SsoClient::Access
