@@ -63,8 +63,9 @@ bool IsShortage(int error) noexcept {
   throw Tarnik::IOException("The trust file '" + path + "' cannot be read: " + std::string(why));
 }
 
-std::int64_t ToNanoseconds(const timespec& time) noexcept {
-  return static_cast<std::int64_t>(time.tv_sec) * 1'000'000'000 + time.tv_nsec;
+std::uint64_t ToNanoseconds(const timespec& time) noexcept {
+  return static_cast<std::uint64_t>(time.tv_sec) * 1'000'000'000 +
+         static_cast<std::uint64_t>(time.tv_nsec);
 }
 
 FileState Look(std::string path) {
