@@ -159,7 +159,7 @@ class RawConnection {
   Tarnik::Testing::Descriptor socket_;
 };
 
-class GuardedServerTest : public SsoClient::Testing::HolderOfKeyTest {
+class GuardedServerThreadTest : public SsoClient::Testing::HolderOfKeyTest {
  protected:
   void SetUp() override {
     if (!EXAMPLES_GUARDED_SERVER) {
@@ -206,7 +206,7 @@ class GuardedServerTest : public SsoClient::Testing::HolderOfKeyTest {
   std::optional<GuardedServerProcess> server_;
 };
 
-TEST_F(GuardedServerTest, AcceptsATokenFromItsOwner) {
+TEST_F(GuardedServerThreadTest, AcceptsATokenFromItsOwner) {
   Server();
   const std::string token = HolderToken();
   const auto agent = MakeAgent(server_->Port(), &Holder());
@@ -218,7 +218,7 @@ TEST_F(GuardedServerTest, AcceptsATokenFromItsOwner) {
   }
 }
 
-TEST_F(GuardedServerTest, RefusesATokenFromSomebodyElse) {
+TEST_F(GuardedServerThreadTest, RefusesATokenFromSomebodyElse) {
   Server();
   const std::string token = HolderToken();
   for (const DevSts::Credential* sender :
@@ -236,7 +236,7 @@ TEST_F(GuardedServerTest, RefusesATokenFromSomebodyElse) {
   EXPECT_EQ(Send(InHeader(token)).status, 200);
 }
 
-TEST_F(GuardedServerTest, AcceptsBearerTokensByOption) {
+TEST_F(GuardedServerThreadTest, AcceptsBearerTokensByOption) {
   const std::string token = BearerToken();
   Server("refuse");
   EXPECT_EQ(Send(InHeader(token)).challenge, kInvalid);
@@ -245,7 +245,7 @@ TEST_F(GuardedServerTest, AcceptsBearerTokensByOption) {
   EXPECT_EQ(Send(InHeader(token), nullptr).body, kAlice);
 }
 
-TEST_F(GuardedServerTest, AcceptsATokenInASecurityHeader) {
+TEST_F(GuardedServerThreadTest, AcceptsATokenInASecurityHeader) {
   Server();
   const std::string token = HolderToken();
   EXPECT_EQ(Send(InMessage(token)).body, kAlice);
@@ -259,7 +259,7 @@ TEST_F(GuardedServerTest, AcceptsATokenInASecurityHeader) {
   EXPECT_EQ(Send(InMessage(inheriting, declaration)).body, kAlice);
 }
 
-TEST_F(GuardedServerTest, RefusesRequestsWithoutOneToken) {
+TEST_F(GuardedServerThreadTest, RefusesRequestsWithoutOneToken) {
   Server();
   const std::string token = HolderToken();
   EXPECT_EQ(Send({}).challenge, "Bearer");
@@ -277,7 +277,7 @@ TEST_F(GuardedServerTest, RefusesRequestsWithoutOneToken) {
   EXPECT_EQ(Send({"Bearer " + Base64("no token"), ""}).challenge, kInvalid);
 }
 
-TEST_F(GuardedServerTest, FollowsTheTrustedCertificates) {
+TEST_F(GuardedServerThreadTest, FollowsTheTrustedCertificates) {
   Server();
   const std::string token = HolderToken();
   EXPECT_EQ(Send(InHeader(token)).status, 200);
@@ -290,7 +290,7 @@ TEST_F(GuardedServerTest, FollowsTheTrustedCertificates) {
   EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(5));
 }
 
-TEST_F(GuardedServerTest, ReadsTheTrustedCertificatesAfterASignal) {
+TEST_F(GuardedServerThreadTest, ReadsTheTrustedCertificatesAfterASignal) {
   Server();
   const std::string token = HolderToken();
   ReplaceTrust("neither a certificate nor anything else");
@@ -303,7 +303,7 @@ TEST_F(GuardedServerTest, ReadsTheTrustedCertificatesAfterASignal) {
   EXPECT_EQ(Send(InHeader(token)).challenge, kInvalid);
 }
 
-TEST_F(GuardedServerTest, SurvivesGarbage) {
+TEST_F(GuardedServerThreadTest, SurvivesGarbage) {
   Server();
   for (const std::string& garbage :
        {std::string("GET / HTTP/1.1\r\nHost: a\r\n\r\n"), std::string("\x16\x03\x01\xff\xff"),
@@ -327,7 +327,7 @@ TEST_F(GuardedServerTest, SurvivesGarbage) {
   EXPECT_EQ(Send(InHeader(HolderToken())).status, 200);
 }
 
-TEST_F(GuardedServerTest, EndsSlowConnections) {
+TEST_F(GuardedServerThreadTest, EndsSlowConnections) {
   Server("refuse", {"300"});
   RawConnection silent(server_->Port());
   RawConnection slow(server_->Port());
@@ -342,7 +342,7 @@ TEST_F(GuardedServerTest, EndsSlowConnections) {
   EXPECT_EQ(run.output.find("HTTP/1.1 "), std::string::npos) << run.output;
 }
 
-TEST_F(GuardedServerTest, LimitsConnections) {
+TEST_F(GuardedServerThreadTest, LimitsConnections) {
   Server("refuse", {kTenMinutes});
   std::vector<std::unique_ptr<RawConnection>> connections;
   for (int i = 0; i < 256; ++i) {
@@ -362,7 +362,7 @@ TEST_F(GuardedServerTest, LimitsConnections) {
   EXPECT_EQ(status, 200);
 }
 
-TEST_F(GuardedServerTest, EndsWithASignal) {
+TEST_F(GuardedServerThreadTest, EndsWithASignal) {
   for (const int signal : {SIGTERM, SIGINT}) {
     Server("refuse", {kTenMinutes});
     // A connection in its handshake, and an idle one
@@ -375,7 +375,7 @@ TEST_F(GuardedServerTest, EndsWithASignal) {
   }
 }
 
-TEST_F(GuardedServerTest, DoesNotStartWithoutTrust) {
+TEST_F(GuardedServerThreadTest, DoesNotStartWithoutTrust) {
   const std::string command = EXAMPLES_FOLDER "/guarded_server/guarded_server " + certificate_ +
                               " " + key_ + " " + kIssuer + " /nonexistent.pem " + kOwnName;
   const auto run = Tarnik::Testing::RunInShell(command + " refuse 2>&1");
