@@ -14,7 +14,7 @@ namespace SsoClient::Access {
 
 namespace {
 
-// Random in each process, so that who chooses an audience or an advice cannot choose its hash.
+// Random, so that whoever chooses an audience or an advice cannot choose its hash.
 SecretTagger MakeTagger() noexcept {
   try {
     return SecretTagger();
@@ -25,9 +25,12 @@ SecretTagger MakeTagger() noexcept {
   }
 }
 
+// Made when the library is loaded: a child that was forked while another thread made it would wait
+// for that thread.
+const SecretTagger keyTagger = MakeTagger();
+
 std::uint64_t TagOf(std::string_view text) noexcept {
-  static const SecretTagger tagger = MakeTagger();
-  return tagger.TagOf(text);
+  return keyTagger.TagOf(text);
 }
 
 class Hasher {

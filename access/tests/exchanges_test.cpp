@@ -126,6 +126,16 @@ TEST_F(ExchangeTest, CallToTheOtherSourceEndsWithTheLastCaller) {
   EXPECT_EQ(Attempts(), 0U);
 }
 
+TEST_F(ExchangeTest, LifeThatTheOtherTokenNeedsHasALimit) {
+  Make();
+  CallContext context;
+  context.minimumLife = seconds::max();
+  EXPECT_TRUE(Get(spec, context).Is<SsoException>());
+  EXPECT_EQ(Attempts(), 1U);
+  EXPECT_GT(base->lastContext.minimumLife, hours(24 * 365 * 29));
+  EXPECT_LT(base->lastContext.minimumLife, hours(24 * 365 * 31));
+}
+
 TEST_F(ExchangeTest, SourceThatReturnsNullIsAnError) {
   base->token = nullptr;
   Make();

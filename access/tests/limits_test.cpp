@@ -142,14 +142,35 @@ class LimitsTest : public SourceFixture {
     source->Stop(milliseconds(0));
   }
 
-  // An outage ends, and a call that waits for that gets a token.
+  // An outage ends, and then there are tokens again.
   void ExpectThatOutageEnds() {
-    ForAll(Fails(Unavailable(milliseconds::max())));
-    config.retry.failuresToOpen = std::max(config.retry.failuresToOpen, 2);
+    const TokenSpec kept = SpecFor("https://kept.example.com");
+    config.keepFresh = {kept};
+    ForAll(Fails(Unreachable()));
     Make();
-    const auto reply = Ask(spec, Within(minutes(1)));
+    const auto during = Ask(spec, Within(minutes(1)));
     runtime->Advance(minutes(2));
-    EXPECT_TRUE(reply->Has());
+    EXPECT_TRUE(during->Has());
+    EXPECT_EQ(during->token, nullptr);
+    ForAll(Issues(hours(1)));
+    std::shared_ptr<Reply> after;
+    for (int minute = 0; minute < 3 && (after == nullptr || after->token == nullptr); ++minute) {
+      after = Ask(spec, Within(minutes(1)));
+      runtime->Advance(minutes(1));
+    }
+    EXPECT_NE(after->token, nullptr) << after->Message();
+    runtime->Advance(minutes(2));
+    EXPECT_NE(source->TryGetToken(kept), nullptr);
+    source->Stop(milliseconds(0));
+  }
+  // As many attempts as `expected`, whatever time passes.
+  void ExpectNoMoreAttemptsThan(std::size_t expected) {
+    const std::size_t before = Attempts();
+    for (std::size_t i = 0; i < expected + 20; ++i) {
+      EXPECT_EQ(Get(spec).token, nullptr);
+      runtime->Advance(hours(24));
+    }
+    EXPECT_EQ(Attempts(), before + expected);
     source->Stop(milliseconds(0));
   }
 };
@@ -164,10 +185,7 @@ TEST_F(LimitsTest, EveryExtremeIsRefusedOrWorks) {
     if (extreme.isAccepted) {
       ExpectThatTokensEnd();
       ExpectThatRefusalIsRemembered();
-      if (config.retry.firstDelay > milliseconds(1) &&
-          config.retry.longestDelay > milliseconds(1)) {
-        ExpectThatOutageEnds();
-      }
+      ExpectThatOutageEnds();
     }
   }
 }
@@ -181,6 +199,33 @@ TEST_F(LimitsTest, LongestRefusalMemoryDoesNotEnd) {
     runtime->Advance(hours(24));
   }
   EXPECT_EQ(Attempts(), 1U);
+}
+
+TEST_F(LimitsTest, LongestDelaysDoNotEnd) {
+  config.endpoints.resize(1);
+  config.retry.attempts = 1;
+  config.retry.firstDelay = milliseconds::max();
+  config.retry.longestDelay = milliseconds::max();
+  ForAll(Fails(Unreachable()));
+  for (int failures = 1; failures <= 12; ++failures) {
+    SCOPED_TRACE(failures);
+    config.retry.failuresToOpen = failures;
+    Make();
+    ExpectNoMoreAttemptsThan(static_cast<std::size_t>(failures));
+  }
+}
+
+TEST_F(LimitsTest, LongestRetryAfterDoesNotEnd) {
+  config.endpoints.resize(1);
+  config.retry.attempts = 1;
+  config.retry.longestRetryAfter = milliseconds::max();
+  for (const milliseconds asked :
+       {milliseconds::max(), milliseconds(hours(24L * 365 * 300)), milliseconds(hours(1000))}) {
+    SCOPED_TRACE(asked.count());
+    ForAll(Fails(Unavailable(asked)));
+    Make();
+    ExpectNoMoreAttemptsThan(1);
+  }
 }
 
 TEST_F(LimitsTest, LongestMarginIsATwentieth) {

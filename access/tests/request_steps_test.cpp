@@ -185,6 +185,42 @@ TEST_F(RenewalTest, FailedRenewalLeavesAllAttemptsToTheLogin) {
   EXPECT_EQ(logins, 2);
 }
 
+TEST_F(RenewalTest, TimeThatAnEndpointAsksForInAnswerToARenewalIsHonoured) {
+  for (const milliseconds asked : {milliseconds(0), milliseconds(minutes(2))}) {
+    SCOPED_TRACE(asked.count());
+    ForAll(IssuesBound(true, own_));
+    Make();
+    scripts[0]->Set(
+        [&, issue = IssuesBound(true, own_)](const AttemptRequest& request, Limit& limit) {
+          return request.operation == AttemptOperation::kRenewal ? Unavailable(asked)
+                                                                 : issue(request, limit);
+        });
+    RefreshOne();
+    scripts[1]->Set(Fails(Unreachable()));
+    const auto reply = Ask(SpecFor("https://other.example.com"));
+    runtime->Advance(minutes(1));
+    ASSERT_TRUE(reply->Has());
+    EXPECT_EQ(reply->token != nullptr, asked == milliseconds(0)) << reply->Message();
+  }
+}
+
+TEST_F(RenewalTest, FailuresOtherThanAnHttpStatusOpenTheCircuit) {
+  config.retry.failuresToOpen = 1;
+  for (const FailureKind kind :
+       {FailureKind::kHttpStatus, FailureKind::kUnreachable, FailureKind::kTimedOut}) {
+    SCOPED_TRACE(NameOf(kind));
+    const std::size_t before = listener->Circuits().size();
+    ForAll(IssuesBound(true, own_));
+    Make();
+    Get(spec);
+    source->TryGetToken(spec);
+    scripts[0]->Set(Fails(Failed<CommunicationException>(kind, "It did not answer.")));
+    runtime->Advance(minutes(45));
+    EXPECT_EQ(scripts[1]->Seen().back().operation, AttemptOperation::kRenewal);
+    EXPECT_EQ(listener->Circuits().size(), before + (kind == FailureKind::kHttpStatus ? 0U : 1U));
+  }
+}
+
 TEST_F(RenewalTest, RenewalThatNoServiceDecidedIsRepeatedAtTheNextEndpoint) {
   Make();
   Get(spec);

@@ -1,7 +1,10 @@
 // For the demo: acquires a token that is bound to a key, and sends it to a server over TLS, with
-// the certificate of that key, or with another one, as a thief would. Prints the server's answer.
+// the certificate of that key, or with another one, as a thief would. Prints the server's answer
+// and saves the token.
 #include <chrono>
+#include <cstddef>
 #include <exception>
+#include <fstream>
 #include <iostream>
 #include <memory>
 #include <string>
@@ -83,15 +86,16 @@ void Print(const Tarnik::Http::ClientResponse& answer) {
 }  // namespace
 
 int main(int argc, char** argv) try {
-  if (argc != 9 && argc != 11) {
+  if (argc != 10 && argc != 12) {
     std::cerr << "usage: call_guarded_server URL CA_FILE STS_CERTIFICATE_FILE CERTIFICATE_FILE"
-                 " KEY_FILE USER SERVER_PORT SERVER_CA_FILE [OTHER_CERTIFICATE OTHER_KEY]"
-                 " < password\n";
+                 " KEY_FILE USER SERVER_PORT SERVER_CA_FILE TOKEN_FILE"
+                 " [OTHER_CERTIFICATE OTHER_KEY] < password\n";
     return 2;
   }
   const HolderOfKeyConfig owner = LoadIdentity(argv[4], argv[5]);
-  const HolderOfKeyConfig sender = argc == 9 ? owner : LoadIdentity(argv[9], argv[10]);
+  const HolderOfKeyConfig sender = argc == 10 ? owner : LoadIdentity(argv[10], argv[11]);
   const auto token = Acquire(argv, owner);
+  std::ofstream(argv[9]) << token->Xml();
   Print(*Send(token->Xml(), std::stoi(argv[7]), argv[8], sender));
   return 0;
 } catch (const std::exception& e) {

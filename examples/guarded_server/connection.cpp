@@ -21,7 +21,7 @@ using SsoClient::Access::Presenter;
 
 namespace {
 
-constexpr std::chrono::seconds kIdleLimit{30};  // until the next request begins
+constexpr std::chrono::seconds kIdleLimit{60};  // until the next request begins
 constexpr std::chrono::seconds kEndLimit{1};    // for the client's end of TLS
 constexpr std::size_t kLargestHeader = std::size_t{64} * 1024;
 constexpr std::size_t kLargestBody = std::size_t{512} * 1024;
@@ -52,7 +52,7 @@ asio::awaitable<void> Connection::Serve() {
   } catch (const beast::system_error&) {
     // The client closed the connection, was too slow or does not speak TLS, or the server stops.
   } catch (const std::exception& e) {
-    std::cerr << "connection of " + sender_ + ": " + e.what() + '\n';
+    std::cerr << sender_ + ": " + e.what() + '\n';
   }
 }
 

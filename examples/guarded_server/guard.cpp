@@ -2,6 +2,8 @@
 
 #include <iostream>
 
+#include <tarnik/text/display_text.h>
+
 namespace GuardedServer {
 namespace {
 
@@ -26,7 +28,7 @@ Response Challenge(const Request& request, http::status status, const char* chal
 
 /// The answer does not say what this service trusts; the log does.
 Response Refuse(const Request& request, const Verdict& verdict, const std::string& sender) {
-  std::cerr << "refused " + sender + '\n' + verdict.ToString();
+  std::cerr << sender + ": " + verdict.ToString();
   switch (RemedyOf(verdict.Refusal())) {
     case Remedy::kAccess:
       return MakeResponse(request, http::status::forbidden, "");
@@ -41,6 +43,11 @@ Response Refuse(const Request& request, const Verdict& verdict, const std::strin
 
 Response Guard::Answer(const Request& request, const SsoClient::Access::Presenter& presenter,
                        const std::string& sender) const try {
+  if (request.method() != http::verb::get && request.method() != http::verb::post) {
+    Response response = MakeResponse(request, http::status::method_not_allowed, "");
+    response.set(http::field::allow, "GET, POST");
+    return response;
+  }
   const auto token = TokenIn(request);
   if (!token) {
     return Challenge(request, http::status::unauthorized, "Bearer");
@@ -52,7 +59,7 @@ Response Guard::Answer(const Request& request, const SsoClient::Access::Presente
   const auto& subject = verdict.Token()->Subject();
   return MakeResponse(request, http::status::ok, subject.name + '@' + subject.domain + '\n');
 } catch (const MalformedRequest& e) {
-  std::cerr << "malformed request from " + sender + ": " + e.what() + '\n';
+  std::cerr << sender + ": malformed request: " + Tarnik::ToDisplayText(e.what(), 1000) + '\n';
   return Challenge(request, http::status::bad_request, "Bearer error=\"invalid_request\"");
 }
 

@@ -14,6 +14,7 @@
 #include <netinet/in.h>
 #include <sys/socket.h>
 
+#include "plugin/host_cycles.h"
 #include "plugin/plugin.h"
 
 namespace {
@@ -33,14 +34,6 @@ std::string ClosedUrl() {
     std::abort();
   }
   return "http://127.0.0.1:" + std::to_string(ntohs(address.sin_port)) + "/sts";
-}
-
-bool IsLoaded(const char* library) {
-  void* handle = dlopen(library, RTLD_NOW | RTLD_NOLOAD);
-  if (handle != nullptr) {
-    dlclose(handle);
-  }
-  return handle != nullptr;
 }
 
 struct Counts {
@@ -74,21 +67,11 @@ int RunCalls(decltype(RunFailingCall)* run, const std::string& url) {
   return counts->failures;
 }
 
-bool RunCycle(const char* plugin, const std::string& url) {
-  void* handle = dlopen(plugin, RTLD_NOW | RTLD_LOCAL);
-  if (handle == nullptr) {
-    std::cerr << dlerror() << '\n';
-    return false;
-  }
+bool UsePlugin(void* handle, const std::string& url) {
   const auto run = reinterpret_cast<decltype(RunFailingCall)*>(dlsym(handle, "RunFailingCall"));
   const int failures = run == nullptr ? 0 : RunCalls(run, url);
   if (failures != kSyncCalls + kAsyncCalls) {
     std::cerr << failures << " calls failed as they should\n";
-    return false;
-  }
-  dlclose(handle);
-  if (IsLoaded(plugin)) {
-    std::cerr << "The plug-in was not unloaded.\n";
     return false;
   }
   return true;
@@ -97,22 +80,7 @@ bool RunCycle(const char* plugin, const std::string& url) {
 }  // namespace
 
 int main(int argc, char** argv) {
-  if (argc < 4) {
-    return 2;
-  }
   const std::string url = ClosedUrl();
-  const int cycles = std::atoi(argv[2]);
-  for (int i = 0; i < cycles; ++i) {
-    if (!RunCycle(argv[1], url)) {
-      return 1;
-    }
-  }
-  int status = 0;
-  for (int i = 3; i < argc; ++i) {
-    if (!IsLoaded(argv[i])) {
-      std::cerr << argv[i] << " was unloaded.\n";
-      status = 1;
-    }
-  }
-  return status;
+  return SsoClient::Testing::RunCycles(argc, argv,
+                                       [&](void* handle) { return UsePlugin(handle, url); });
 }

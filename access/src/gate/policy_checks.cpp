@@ -47,7 +47,8 @@ bool Proves(const Presenter& presenter, const Tarnik::Crypto::Certificate& holde
   if (presenter.GetKind() == Presenter::Kind::kTlsCertificate) {
     return Tarnik::Crypto::IsSameCertificate(*presenter.Certificate(), holder);
   }
-  return presenter.GetKind() == Presenter::Kind::kSignature &&
+  // Nobody has chosen empty data for this exchange.
+  return presenter.GetKind() == Presenter::Kind::kSignature && !presenter.Data().empty() &&
          Tarnik::Crypto::VerifyData(holder, presenter.Algorithm(), presenter.Data(),
                                     presenter.Signature());
 }

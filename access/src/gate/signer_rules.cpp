@@ -27,7 +27,8 @@ Signers SelectSigners(const TrustSnapshot& trust, const SamlToken& token) {
     return {};
   }
   try {
-    return issuer->Select(token.GetSignature()->KeyInfo());
+    const auto signature = token.GetSignature();
+    return issuer->Select(signature->KeyInfo(), signature->SignatureMethod());
   } catch (const Tarnik::Exception&) {
     return {};  // the only certificate that was selected has a key that cannot be used
   }

@@ -88,7 +88,7 @@ Verdict Verdict::Accept(std::shared_ptr<const SamlToken> token) {
   return Verdict(std::move(facts));
 }
 
-Verdict Verdict::Refuse(Reason reason, std::string message) {
+Verdict Verdict::Refuse(Reason reason, const std::string& message) {
   if (reason == Reason::kNone) {
     throw Tarnik::InvalidArgumentException("A refusal needs a reason.");
   }

@@ -25,7 +25,16 @@ void CheckPaths(const std::vector<std::string>& paths) {
   }
 }
 
+// An entry without an issuer is for any: that has to be said, since it may have been forgotten.
+void CheckName(const TrustedIssuer& issuer) {
+  RequireTrust(issuer.isForAnyIssuer || !issuer.issuer.empty(),
+               "An entry of the trust store names no issuer and is not for any issuer.");
+  RequireTrust(!issuer.isForAnyIssuer || issuer.issuer.empty(),
+               "An entry of the trust store names an issuer and is for any issuer.");
+}
+
 void CheckIssuer(const TrustedIssuer& issuer) {
+  CheckName(issuer);
   RequireTrust(!issuer.certificates.empty() || !issuer.certificatePaths.empty(),
                "An issuer of the trust store has neither a certificate nor a path of one.");
   RequireTrust(std::find(issuer.certificates.begin(), issuer.certificates.end(), nullptr) ==

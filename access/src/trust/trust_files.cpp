@@ -63,8 +63,9 @@ bool IsShortage(int error) noexcept {
   throw Tarnik::IOException("The trust file '" + path + "' cannot be read: " + std::string(why));
 }
 
-std::int64_t ToNanoseconds(const timespec& time) noexcept {
-  return static_cast<std::int64_t>(time.tv_sec) * 1'000'000'000 + time.tv_nsec;
+std::uint64_t ToNanoseconds(const timespec& time) noexcept {
+  return static_cast<std::uint64_t>(time.tv_sec) * 1'000'000'000 +
+         static_cast<std::uint64_t>(time.tv_nsec);
 }
 
 FileState Look(std::string path) {
@@ -129,7 +130,9 @@ PathState LookAtPath(const std::string& path, Content content) {
   std::vector<std::string> names;
   state.target.error = ListNames(path, content, names);
   for (const std::string& name : names) {
-    state.files.push_back(Look(path + "/" + name));
+    std::string file = path;
+    file.append("/").append(name);
+    state.files.push_back(Look(file));
   }
   return state;
 }

@@ -19,8 +19,8 @@ struct FileState {
   std::uint64_t device = 0;
   std::uint64_t inode = 0;
   std::uint64_t size = 0;
-  std::int64_t modified = 0;  ///< mtime, in nanoseconds
-  std::int64_t changed = 0;   ///< ctime, in nanoseconds
+  std::uint64_t modified = 0;  ///< mtime, in nanoseconds; wraps, since it may be any year
+  std::uint64_t changed = 0;   ///< ctime, in nanoseconds
   std::uint32_t mode = 0;
   int error = 0;  ///< why nothing else is known (errno); zero if it is
 

@@ -20,15 +20,26 @@ const Signer* FindCertificate(const std::vector<Signer>& signers,
   return found == signers.end() ? nullptr : &*found;
 }
 
+// By the URI of a signature method (RFC 6931, section 2.3).
+bool HasKeyFor(std::string_view method, const Tarnik::Crypto::Certificate& certificate) {
+  const bool isForEc = method.find("#ecdsa-") != std::string_view::npos;
+  return isForEc == (certificate.GetPublicKey()->Algorithm() == Tarnik::Crypto::KeyAlgorithm::kEc);
+}
+
 }  // namespace
 
-std::vector<const Signer*> IssuerTrust::Select(
-    const Tarnik::Xml::Security::KeyInfo& keyInfo) const {
+std::vector<const Signer*> IssuerTrust::Select(const Tarnik::Xml::Security::KeyInfo& keyInfo,
+                                               std::string_view method) const {
   std::vector<const Signer*> selected;
   if (resolver == nullptr) {
     return selected;
   }
-  for (const auto& certificate : resolver->CandidateCertificates(keyInfo)) {
+  auto candidates = resolver->CandidateCertificates(keyInfo);
+  if (candidates.size() > kMostCandidates) {
+    std::erase_if(candidates,
+                  [method](const auto& certificate) { return !HasKeyFor(method, *certificate); });
+  }
+  for (const auto& certificate : candidates) {
     if (selected.size() == kMostCandidates) {
       break;
     }

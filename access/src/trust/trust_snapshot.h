@@ -39,8 +39,10 @@ struct IssuerTrust {
   /// Selects among the signers' certificates; null without signers.
   Tarnik::Ref<const Tarnik::Xml::Security::CertificateCandidatesResolver> resolver;
 
-  /// The signers that a signature with `keyInfo` may have been made by, at most 16.
-  std::vector<const Signer*> Select(const Tarnik::Xml::Security::KeyInfo& keyInfo) const;
+  /// The signers that a signature by `method` with `keyInfo` may have been made by, at most 16. If
+  /// there are more, those whose keys are of another type do not count.
+  std::vector<const Signer*> Select(const Tarnik::Xml::Security::KeyInfo& keyInfo,
+                                    std::string_view method) const;
 };
 
 /// The whole trust as it was read at one moment. Immutable; thread-safe.

@@ -130,6 +130,30 @@ TEST_F(AccessExamplesTest, ActAsFreshExchangesOnceForAllLines) {
   EXPECT_THAT(missing.output, StartsWith("No token: "));
 }
 
+TEST_F(AccessExamplesTest, CheckCallerPrintsEachCheck) {
+  TokenSpec spec = SsoClient::Testing::TenMinutes();
+  spec.audienceRestriction = {"https://orders.example.com"};
+  const auto token = AcquireBound(spec);
+  const std::string command = "check_caller " + token->Issuer() + " " + folder_.Path() +
+                              "/signing.pem https://orders.example.com ";
+  const std::string file = folder_.Write("token.xml", token->Xml()) + " ";
+  const std::string peer = folder_.Write("client.pem", Holder().certificatePem);
+
+  const CommandResult run = RunExample(command + file + peer);
+  EXPECT_EQ(run.status, 0);
+  EXPECT_THAT(run.output, StartsWith("accepted\n  size: passed"));
+  EXPECT_THAT(run.output, HasSubstr("\n  possession: passed"));
+
+  const CommandResult thief = RunExample(command + file);
+  EXPECT_EQ(thief.status, 1);
+  EXPECT_THAT(thief.output, StartsWith("refused (no-proof): "));
+  EXPECT_THAT(thief.output, HasSubstr("\n  possession: failed"));
+
+  const CommandResult missing = RunExample(command + "/nonexistent/token.xml " + peer);
+  EXPECT_EQ(missing.status, 2);
+  EXPECT_EQ(missing.output, "check_caller: cannot read /nonexistent/token.xml\n");
+}
+
 TEST_F(AccessExamplesTest, FakeTokenSourceNeedsNoService) {
   const auto token = Acquire();
   const CommandResult run = RunExample("fake_token_source " + folder_.Write("t.xml", token->Xml()));

@@ -3,6 +3,7 @@
 #include <chrono>
 #include <cstddef>
 #include <filesystem>
+#include <functional>
 #include <iterator>
 #include <memory>
 #include <string>
@@ -136,10 +137,10 @@ class AbandonedAttemptsAsyncTest : public AbandonedCallsAsyncTest {
     ASSERT_NE(result.token, nullptr) << result.message;
     service_.SetMisbehavior(Stalling(DevSts::Stall::BeforeAnswer));
   }
-  TokenCalls BeginCalls(const CallContext& context) {
+  TokenCalls BeginCalls(const std::function<CallContext()>& makeContext) {
     TokenCalls calls;
     for (std::size_t i = 0; i < kAbandoned; ++i) {
-      calls.Begin(*source_, SpecFor(++calls_), context);
+      calls.Begin(*source_, SpecFor(++calls_), makeContext());
     }
     return calls;
   }
@@ -166,7 +167,7 @@ TEST_F(AbandonedAttemptsAsyncTest, LeaveAHealthyServiceAsFastAsBefore) {
   const CancellationSource cancellation;
   CallContext context;
   context.cancellation = cancellation.Token();
-  const TokenCalls calls = BeginCalls(context);
+  const TokenCalls calls = BeginCalls([&context] { return context; });
   ASSERT_TRUE(AwaitUnderWay(1min));
   const double during = RatioTo(before);
   RecordProperty("ratio while they wait", std::to_string(during));
@@ -191,7 +192,7 @@ TEST_F(AbandonedAttemptsAsyncTest, EndWhenTheDeadlinesOfTheirCallersHavePassed) 
   bool wereUnderWay = false;
   for (auto limit = 1000ms; limit <= 32s && !wereUnderWay; limit *= 2) {
     Silence();
-    const TokenCalls calls = BeginCalls(CallContext::Within(limit));
+    const TokenCalls calls = BeginCalls([limit] { return CallContext::Within(limit); });
     wereUnderWay = AwaitUnderWay(limit);
     for (const Result& result : calls.Wait()) {
       EXPECT_TRUE(result.Is<CommunicationException>()) << result.type << result.message;

@@ -11,6 +11,7 @@
 #include <gmock/gmock.h>
 
 #include "end_to_end/end_to_end_fixture.h"
+#include "end_to_end/silent_resolver.h"
 
 namespace SsoClient::Access::Testing {
 namespace {
@@ -110,6 +111,25 @@ TEST_F(AccountAsyncTest, AChangedPasswordIsUsedAtOnce) {
   EXPECT_TRUE(Get(*source, SpecFor(1)).Is<InvalidCredentialsException>());
   EXPECT_EQ(Get(*source, SpecFor(0)).token, result.token);
   EXPECT_EQ(Requests(), 2U);
+}
+
+TEST_F(AccountAsyncTest, ACallThatLeavesBeforeThePasswordIsSentDelaysNoOther) {
+  const SilentResolver resolver;
+  TokenSourceConfig config = Trusting({});
+  config.endpoints = {{"http://" + std::string(SilentResolver::kSilentHost) + "/sts", ""}};
+  // The pause if nobody knew what the service thinks of the password.
+  config.retry.firstDelay = config.retry.longestDelay = std::chrono::hours(1000);
+  const auto source = Make(config);
+  const CancellationSource cancellation;
+  CallContext context;
+  context.cancellation = cancellation.Token();
+  TokenCalls calls;
+  calls.Begin(*source, SpecFor(0), context);
+  ASSERT_TRUE(resolver.Await(1));
+  cancellation.Cancel();
+  EXPECT_TRUE(calls.Wait().front().Is<Tarnik::CancelledException>());
+  calls.Begin(*source, SpecFor(1));
+  EXPECT_TRUE(listener_->Await([](const Records& seen) { return seen.begun.size() == 2; }));
 }
 
 TEST_F(AccountAsyncTest, TheLongestDurationsOfAConfigurationWork) {

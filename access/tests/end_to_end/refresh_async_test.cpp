@@ -52,6 +52,16 @@ class RefreshAsyncTest : public EndToEndTest {
     options.maxLifetime = lifetime;
     sts_.SetAssertionOptions(options);
   }
+  /// A source whose tokens are bound to a key, and are refreshed after a second.
+  std::shared_ptr<TokenSource> MakeForBoundTokens() {
+    Grant(20s);
+    return Make(After(0.05, BoundConfigFor({&sts_})));
+  }
+  TokenSpec Renewable() const {
+    TokenSpec spec = spec_;
+    spec.renewable = true;
+    return spec;
+  }
   /// Gets a token, and asks for it again, so that it is refreshed.
   std::shared_ptr<const SamlToken> GetAndAskAgain(TokenSource& source, const TokenSpec& spec) {
     const Result result = Get(source, spec);
@@ -109,10 +119,8 @@ TEST_F(RefreshAsyncTest, ATokenThatNobodyAsksForIsNotReplaced) {
 }
 
 TEST_F(RefreshAsyncTest, ARenewableTokenIsRenewed) {
-  Grant(20s);
-  TokenSpec spec = spec_;
-  spec.renewable = true;
-  const auto source = Make(After(0.05, BoundConfigFor({&sts_})));
+  const auto source = MakeForBoundTokens();
+  const TokenSpec spec = Renewable();
   const auto token = GetAndAskAgain(*source, spec);
   ASSERT_NE(token, nullptr);
   EXPECT_TRUE(token->IsRenewable());
@@ -127,10 +135,8 @@ TEST_F(RefreshAsyncTest, ARenewableTokenIsRenewed) {
 }
 
 TEST_F(RefreshAsyncTest, ARenewalThatFailsLogsIn) {
-  Grant(20s);
-  TokenSpec spec = spec_;
-  spec.renewable = true;
-  const auto source = Make(After(0.05, BoundConfigFor({&sts_})));
+  const auto source = MakeForBoundTokens();
+  const TokenSpec spec = Renewable();
   const auto token = GetAndAskAgain(*source, spec);
   ASSERT_NE(token, nullptr);
   ASSERT_TRUE(sts_.Revoke(token->Id()));
@@ -148,8 +154,7 @@ TEST_F(RefreshAsyncTest, ARenewalThatFailsLogsIn) {
 }
 
 TEST_F(RefreshAsyncTest, ATokenThatIsNotRenewableIsNotRenewed) {
-  Grant(20s);
-  const auto source = Make(After(0.05, BoundConfigFor({&sts_})));
+  const auto source = MakeForBoundTokens();
   const auto token = GetAndAskAgain(*source, spec_);
   ASSERT_NE(token, nullptr);
   EXPECT_FALSE(token->IsRenewable());

@@ -19,8 +19,20 @@ void CallOnce(FaultCase& tested) {
   tested.runtime->Settle();
 }
 
+void CallForTwoKeys(FaultCase& tested) {
+  tested.Call(tested.first, tested.spec);
+  tested.Call(tested.second, tested.other);
+  tested.runtime->Settle();
+}
+
 void CheckFirst(FaultCase& tested, bool hasHappened) {
   ExpectOneOutcome(tested.first, hasHappened);
+  ExpectWorks(tested);
+}
+
+void CheckBoth(FaultCase& tested, bool hasHappened) {
+  ExpectOneOutcome(tested.first, hasHappened);
+  ExpectOneOutcome(tested.second, hasHappened);
   ExpectWorks(tested);
 }
 
@@ -43,9 +55,7 @@ TEST(CallFaultsTest, TwoCallersOfOneKey) {
     tested.runtime->Settle();
   };
   const auto check = [](FaultCase& tested, bool hasHappened) {
-    ExpectOneOutcome(tested.first, hasHappened);
-    ExpectOneOutcome(tested.second, hasHappened);
-    ExpectWorks(tested);
+    CheckBoth(tested, hasHappened);
     // All timers of callers are cancelled, or have fired.
     tested.runtime->Advance(hours(3));
     EXPECT_EQ(tested.first.outcomes, 1);
@@ -117,11 +127,6 @@ TEST(CallFaultsTest, Refusal) {
     });
     tested.Make();
   };
-  const auto run = [](FaultCase& tested) {
-    tested.Call(tested.first, tested.spec);
-    tested.Call(tested.second, tested.other);
-    tested.runtime->Settle();
-  };
   const auto check = [&refusals](FaultCase& tested, bool) {
     EXPECT_EQ(tested.first.outcomes, 1);
     EXPECT_EQ(tested.second.outcomes, 1);
@@ -132,7 +137,7 @@ TEST(CallFaultsTest, Refusal) {
     tested.password = "changed";
     ExpectWorks(tested);
   };
-  EXPECT_GT(FailEachAllocation({prepare, run, check}), 20U);
+  EXPECT_GT(FailEachAllocation({prepare, CallForTwoKeys, check}), 20U);
 }
 
 TEST(CallFaultsTest, WaitingForATurn) {
@@ -146,17 +151,7 @@ TEST(CallFaultsTest, WaitingForATurn) {
       return Issued(tested.NewToken(hours(1)));
     });
   };
-  const auto run = [](FaultCase& tested) {
-    tested.Call(tested.first, tested.spec);
-    tested.Call(tested.second, tested.other);
-    tested.runtime->Settle();
-  };
-  const auto check = [](FaultCase& tested, bool hasHappened) {
-    ExpectOneOutcome(tested.first, hasHappened);
-    ExpectOneOutcome(tested.second, hasHappened);
-    ExpectWorks(tested);
-  };
-  EXPECT_GT(FailEachAllocation({prepare, run, check}), 20U);
+  EXPECT_GT(FailEachAllocation({prepare, CallForTwoKeys, CheckBoth}), 20U);
 }
 
 TEST(CallFaultsTest, Deadline) {

@@ -49,5 +49,16 @@ TEST_F(GateConfigCheckTest, DefaultsWithWhatMustBeSaid) {
   EXPECT_FALSE(GateConfig{}.acceptsUnrestrictedTokens);
 }
 
+// Those of the guide's table of limits.
+TEST_F(GateConfigCheckTest, DefaultsOfLimits) {
+  const GateConfig limits;
+  EXPECT_EQ(limits.clockTolerance, std::chrono::minutes(5));
+  EXPECT_EQ(limits.longestLifetime, std::chrono::hours(31 * 24));
+  EXPECT_EQ(limits.deepestDelegation, 10U);
+  EXPECT_EQ(limits.largestToken, 262'144U);
+  EXPECT_EQ(limits.cache.tokens, 10'000U);
+  EXPECT_EQ(limits.cache.bytes, 67'108'864U);
+}
+
 }  // namespace
 }  // namespace SsoClient::Access::Testing

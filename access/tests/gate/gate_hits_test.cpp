@@ -58,6 +58,13 @@ TEST_F(GateHitsTest, NoCache) {
   ExpectCounts(*gate, 0, 2, 0);
 }
 
+// As documented at `GateCacheConfig::bytes`.
+TEST_F(GateHitsTest, MemoryIsCountedByTheLengthOfTheText) {
+  const auto gate = Make();
+  ExpectAccepted(CheckAt(*gate, token));
+  EXPECT_EQ(gate->Metrics().cachedBytes, 1024 + token.size() * 9 / 2);
+}
+
 TEST_F(GateHitsTest, OneByteDiffers) {
   const auto gate = Make();
   ExpectAccepted(CheckAt(*gate, token));

@@ -1,5 +1,6 @@
 // The instants at which verdicts change, to the microsecond.
 #include <limits>
+#include <stdexcept>
 
 #include "gate/gate_fixture.h"
 
@@ -122,6 +123,11 @@ TEST_F(GateTimesTest, ClockThatIsSetBackAndForth) {
   EXPECT_EQ(reasonAfter(hours(0)), Reason::kNone);
   EXPECT_EQ(reasonAfter(hours(2)), Reason::kExpired);
   EXPECT_EQ(reasonAfter(hours(0)), Reason::kNone);
+}
+
+TEST_F(GateTimesTest, ExceptionsOfTheClockPassThrough) {
+  config.clock = []() -> Tarnik::System::DateTime { throw std::runtime_error("no clock"); };
+  EXPECT_THROW(Check(token), std::runtime_error);
 }
 
 TEST_F(GateTimesTest, SystemClock) {

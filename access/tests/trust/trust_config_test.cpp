@@ -31,8 +31,20 @@ TEST_F(TrustConfigTest, IssuersNeedACertificateOrThePathOfOne) {
 }
 
 TEST_F(TrustConfigTest, EveryIssuerIsChecked) {
-  config.issuers.emplace_back();
+  config.issuers.emplace_back().issuer = kIssuer;
   EXPECT_EQ(Refusal(), "An issuer of the trust store has neither a certificate nor a path of one.");
+}
+
+TEST_F(TrustConfigTest, IssuerThatIsLeftOutIsNotAnyIssuer) {
+  issuer.issuer.clear();
+  EXPECT_EQ(Refusal(), "An entry of the trust store names no issuer and is not for any issuer.");
+  issuer.isForAnyIssuer = true;
+  EXPECT_EQ(Refusal(), "nothing");
+}
+
+TEST_F(TrustConfigTest, AnyIssuerHasNoName) {
+  issuer.isForAnyIssuer = true;
+  EXPECT_EQ(Refusal(), "An entry of the trust store names an issuer and is for any issuer.");
 }
 
 TEST_F(TrustConfigTest, CertificatesMustNotBeNull) {

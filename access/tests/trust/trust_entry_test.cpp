@@ -82,6 +82,23 @@ TEST_F(TrustEntryTest, ListOfTheIssuerCoversItsCertificates) {
             (now - 200) * 1'000'000);
 }
 
+TEST_F(TrustEntryTest, DescriptionSaysWhatTheListsSay) {
+  const std::time_t now = std::time(nullptr);
+  Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(1), 100, -200, now));
+  Put("trust/b.pem", Sts(1).Pem());
+  Make();
+  const auto description = store->Describe();
+  ASSERT_EQ(description.signers.size(), 2U);
+  for (const TrustedSigner& signer : description.signers) {
+    EXPECT_TRUE(signer.isRevocationChecked);
+    ASSERT_TRUE(signer.listUntil);
+    EXPECT_EQ(signer.listUntil->GetUtcTime(), (now + 100) * 1'000'000);
+  }
+  EXPECT_FALSE(description.signers[0].revokedSince);
+  ASSERT_TRUE(description.signers[1].revokedSince);
+  EXPECT_EQ(description.signers[1].revokedSince->GetUtcTime(), (now - 200) * 1'000'000);
+}
+
 TEST_F(TrustEntryTest, ListThatIsAddedCounts) {
   Make();
   Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(0)));

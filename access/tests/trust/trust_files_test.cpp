@@ -5,6 +5,7 @@
 #include <fstream>
 #include <string>
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
@@ -37,10 +38,16 @@ class TrustFilesTest : public TrustFixture {
     return WithoutRoot(MessageOf<IOException>([this] { Read(); }));
   }
 
-  std::int64_t ChangeTimeOf(const std::string& name) const {
+  std::uint64_t ChangeTimeOf(const std::string& name) const {
     struct stat found {};
     stat(PathOf(name).c_str(), &found);
-    return static_cast<std::int64_t>(found.st_ctim.tv_sec) * 1'000'000'000 + found.st_ctim.tv_nsec;
+    return static_cast<std::uint64_t>(found.st_ctim.tv_sec) * 1'000'000'000 +
+           static_cast<std::uint64_t>(found.st_ctim.tv_nsec);
+  }
+  void SetModified(const std::string& name, std::time_t seconds) const {
+    const timespec time{seconds, 1};
+    const timespec times[] = {time, time};
+    ASSERT_EQ(utimensat(AT_FDCWD, PathOf(name).c_str(), times, 0), 0);
   }
 
   static constexpr std::size_t kLargest = kLargestTrustFile;
@@ -147,6 +154,17 @@ TEST_F(TrustFilesTest, TimeThatIsSetBackDoesNotHideAChange) {
     std::ofstream(PathOf("trust/a.pem")) << "b";
     std::filesystem::last_write_time(PathOf("trust/a.pem"), time);
   } while (ChangeTimeOf("trust/a.pem") == before.entries[0].certificates[0].files[0].changed);
+  EXPECT_NE(ListFiles(config.issuers), before);
+}
+
+// In nanoseconds, more than 64 bits can count.
+TEST_F(TrustFilesTest, TimesOfFilesMayBeFarAway) {
+  constexpr std::time_t kYear2445 = 15'000'000'000;
+  Put("trust/a.pem", "a");
+  SetModified("trust/a.pem", kYear2445);
+  const TrustListing before = ListFiles(config.issuers);
+  EXPECT_EQ(ReadFiles(before).entries[0].certificates[0].bytes, "a");
+  SetModified("trust/a.pem", kYear2445 - 1);
   EXPECT_NE(ListFiles(config.issuers), before);
 }
 

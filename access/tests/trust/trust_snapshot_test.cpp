@@ -1,6 +1,8 @@
 #include "trust/trust_snapshot.h"
 
+#include <algorithm>
 #include <string>
+#include <string_view>
 
 #include <gtest/gtest.h>
 
@@ -14,6 +16,9 @@ namespace {
 
 using Tarnik::Xml::Security::KeyInfo;
 
+constexpr std::string_view kEcdsa = "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha256";
+constexpr std::string_view kRsa = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
+
 class TrustSnapshotTest : public TrustFixture {
  protected:
   static KeyInfo HintAt(const Identity& identity) {
@@ -24,10 +29,10 @@ class TrustSnapshotTest : public TrustFixture {
     return keyInfo;
   }
 
-  Names Select(const KeyInfo& keyInfo) const {
+  Names Select(const KeyInfo& keyInfo, std::string_view method = kEcdsa) const {
     Names names;
     const auto trust = store->Current();
-    for (const Signer* signer : trust->Find(kIssuer)->Select(keyInfo)) {
+    for (const Signer* signer : trust->Find(kIssuer)->Select(keyInfo, method)) {
       names.push_back(signer->certificate->SubjectName());
     }
     return names;
@@ -55,8 +60,29 @@ TEST_F(TrustSnapshotTest, WithoutHintsTheFirstSixteenAreSelected) {
   EXPECT_EQ(selected.back(), "CN=sts-15");
 }
 
+TEST_F(TrustSnapshotTest, KeysOfAnotherTypeDoNotCountAmongMoreThanSixteen) {
+  Tarnik::Testing::IdentityOptions options;
+  options.commonName = "rsa";
+  options.rsaBits = 2048;
+  std::string all;
+  for (std::size_t i = 1; i < 15; ++i) {
+    all += Sts(i).Pem();
+  }
+  all += Tarnik::Testing::MakeIdentity(options, &TrustCa()).Pem();
+  Put("trust/b.pem", all);
+  Make();
+  // With sixteen, verification says what does not fit.
+  EXPECT_EQ(Select({}, kRsa).size(), 16U);
+  Put("trust/c.pem", Sts(15).Pem());
+  Make();
+  EXPECT_EQ(Select({}, kRsa), Names{"CN=rsa"});
+  const Names selected = Select({}, kEcdsa);
+  EXPECT_EQ(selected.size(), 16U);
+  EXPECT_EQ(std::count(selected.begin(), selected.end(), "CN=rsa"), 0);
+}
+
 TEST_F(TrustSnapshotTest, NobodyIsSelectedWithoutSigners) {
-  EXPECT_TRUE(IssuerTrust().Select({}).empty());
+  EXPECT_TRUE(IssuerTrust().Select({}, kEcdsa).empty());
 }
 
 }  // namespace

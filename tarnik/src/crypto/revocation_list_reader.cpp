@@ -115,12 +115,12 @@ void CheckListExtensions(const Extensions* extensions) {
 }
 
 OwnedAuthorityKey AuthorityKeyOf(const X509_CRL* list) {
-  constexpr int kAbsent = -1;
+  constexpr int kNoExtension = -1;
   const OpenSsl::ErrorScope errors;
   int critical = 0;
   OwnedAuthorityKey key(static_cast<AUTHORITY_KEYID*>(
       X509_CRL_get_ext_d2i(list, NID_authority_key_identifier, &critical, nullptr)));
-  if (key == nullptr && critical != kAbsent) {
+  if (key == nullptr && critical != kNoExtension) {
     ThrowBrokenList(errors, "authority key identifier");
   }
   return key;

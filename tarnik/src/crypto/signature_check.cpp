@@ -83,8 +83,9 @@ bool IsEcdsaDer(const std::vector<unsigned char>& signature, std::size_t orderLe
     return false;
   }
   ShortDerReader numbers(content, content + length);
-  return ReadsPositiveNumber(numbers, orderLength) && ReadsPositiveNumber(numbers, orderLength) &&
-         numbers.IsAtEnd();
+  const bool hasR = ReadsPositiveNumber(numbers, orderLength);
+  const bool hasS = hasR && ReadsPositiveNumber(numbers, orderLength);
+  return hasS && numbers.IsAtEnd();
 }
 
 bool IsSignatureOf(const PublicKeyImpl& key, SignatureScheme scheme, Hash hash,

@@ -49,6 +49,17 @@ bool IsControl(std::string_view character) noexcept {
   return first < 0x20 || first == 0x7F || (first == 0xC2 && ByteAt(character, 1) < 0xA0);
 }
 
+/// Ends a line, or changes the order in which the text around it is shown: U+2028 and U+2029, and
+/// the characters with the property Bidi_Control (Unicode Standard Annex #9, section 2).
+bool MovesOtherText(std::string_view character) noexcept {
+  if (character == "\u061C") {
+    return true;
+  }
+  return (character >= "\u200E" && character <= "\u200F") ||
+         (character >= "\u2028" && character <= "\u202E") ||
+         (character >= "\u2066" && character <= "\u2069");
+}
+
 }  // namespace
 
 std::string ToDisplayText(std::string_view text, std::size_t maxBytes) {
@@ -60,7 +71,7 @@ std::string ToDisplayText(std::string_view text, std::size_t maxBytes) {
     if (position + character.size() > maxBytes) {
       return shown.append("...");
     }
-    if (length == 0 || IsControl(character)) {
+    if (length == 0 || IsControl(character) || MovesOtherText(character)) {
       shown.push_back('?');
     } else {
       shown.append(character);

@@ -19,6 +19,18 @@ TEST(DisplayTextTest, ReplacesControlCharacters) {
   EXPECT_EQ(ToDisplayText("a\xC2\x9Bz", 256), "a?z");
 }
 
+// They would let a part of a line look like another line, or appear at another place.
+TEST(DisplayTextTest, ReplacesWhatMovesOtherText) {
+  for (const char* text : {"a\u061Cz", "a\u200Ez", "a\u200Fz", "a\u2028z", "a\u2029z", "a\u202Az",
+                           "a\u202Ez", "a\u2066z", "a\u2069z"}) {
+    EXPECT_EQ(ToDisplayText(text, 256), "a?z");
+  }
+  for (const char* text : {"a\u061Bz", "a\u061Dz", "a\u200Dz", "a\u2010z", "a\u2027z", "a\u202Fz",
+                           "a\u2065z", "a\u206Az"}) {
+    EXPECT_EQ(ToDisplayText(text, 256), text);
+  }
+}
+
 TEST(DisplayTextTest, ReplacesBytesThatAreNotUtf8) {
   EXPECT_EQ(ToDisplayText("Gr\xF6\xDF"
                           "e",

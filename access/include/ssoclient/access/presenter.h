@@ -13,6 +13,7 @@ namespace SsoClient::Access {
 
 /// What a server knows about the sender of a token, which is compared with the key that a
 /// holder-of-key token is bound to (SAML 2.0 profiles, section 3.1). A value; thread-safe as one.
+/// One that was moved from may only be assigned to and destroyed.
 class SSOCLIENT_ACCESS_EXPORT Presenter {
  public:
   /// What the server knows.
@@ -20,17 +21,19 @@ class SSOCLIENT_ACCESS_EXPORT Presenter {
 
   /// Nothing is known: holder-of-key tokens are refused.
   static Presenter Nobody();
-  /// The sender has proved in a TLS handshake that it has the key of `certificate`. The server must
-  /// have required and verified that proof, as TLS libraries do for client certificates; the
-  /// certificate need not be issued by anybody that the server trusts, since the token names it.
-  /// Null, which such libraries return for a client without a certificate, counts as `Nobody`. The
-  /// certificate must come from the server's own connection: one in a header is a claim of whoever
-  /// can reach the server.
+  /// The sender has proved in a TLS handshake that it has the key of `certificate`. A holder-of-key
+  /// token must name this certificate: another one of the same key is refused. The server must have
+  /// required and verified that proof, as TLS libraries do for client certificates; the certificate
+  /// need not be issued by anybody that the server trusts, since the token names it. Null, which
+  /// such libraries return for a client without a certificate, counts as `Nobody`. The certificate
+  /// must come from the server's own connection: one in a header is a claim of whoever can reach
+  /// the server.
   static Presenter WithTlsCertificate(Tarnik::Ref<const Tarnik::Crypto::Certificate> certificate);
   /// The sender has sent `signature`, which is to be one of `data` by the token's key. The proof is
   /// worth what `data` is worth: it must contain something that the server chose for this exchange,
   /// such as a random challenge, and should contain the SHA-256 of the token, so that a signature
-  /// made for another exchange or another token with the same key does not fit.
+  /// made for another exchange or another token with the same key does not fit. Empty data proves
+  /// nothing.
   static Presenter WithSignature(std::string data, std::vector<unsigned char> signature,
                                  Tarnik::Crypto::SignatureAlgorithm algorithm);
 

@@ -61,7 +61,7 @@ struct GateConfig {
   /// thread of the check, several at once. The token is refused if it throws. Rules that depend on
   /// the request are better checked after the verdict, on `Verdict::Token`.
   std::function<bool(const SamlToken& token, std::string& why)> predicate{};
-  /// The longest text of a token in bytes; longer ones are refused before they are read.
+  /// The longest text of a token in bytes; longer ones are refused before they are read. Positive.
   std::size_t largestToken = std::size_t{256} * 1024;
   GateCacheConfig cache{};
   /// The current time; the system's clock if it is empty. For tests.
@@ -86,8 +86,10 @@ struct GateMetrics {
 ///
 /// An accepted token is remembered by the SHA-256 of its whole text. When it is presented again, it
 /// is not read and its signature is not verified again while the trust store is unchanged; all
-/// other checks are made again, with the presenter and the time of that presentation. Nothing is
-/// kept of a token that was never accepted, nor of one that is presented after its end.
+/// other checks are made again, with the presenter and the time of that presentation. A gate keeps
+/// nothing of a token that was never accepted, nor of one that is presented after its end; the
+/// platform keeps the certificates that it has decoded last
+/// (`Tarnik::Crypto::CreateCertificateFromDer`).
 ///
 /// Thread-safe; a check takes no lock for longer than a look-up in a part of the cache, and never
 /// waits for a file or the network. May be used in a forked child, where the cache begins empty.

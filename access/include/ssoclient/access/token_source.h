@@ -234,7 +234,9 @@ class SSOCLIENT_ACCESS_EXPORT TokenSource {
   virtual std::shared_ptr<const SamlToken> GetToken(const TokenSpec& spec,
                                                     const CallContext& context = {}) = 0;
   /// Returns the token that `GetToken` would return from the cache, and null if it would have to
-  /// wait. Sends nothing, and never blocks. Throws `Tarnik::InvalidStateException` after `Stop`,
+  /// wait. Sends nothing, and never blocks. Refreshes are timed by a clock that stops while the
+  /// machine is suspended: a token that has ended meanwhile is replaced by the next `GetToken`, or
+  /// when its refresh is due. Throws `Tarnik::InvalidStateException` after `Stop`,
   /// and `Tarnik::InvalidArgumentException` for a spec that cannot be sent.
   virtual std::shared_ptr<const SamlToken> TryGetToken(const TokenSpec& spec) = 0;
   /// Does what `GetToken` does without blocking, and reports to `callback` what that returns or

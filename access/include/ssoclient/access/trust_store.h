@@ -24,8 +24,8 @@ namespace SsoClient::Access {
 /// folder, other folders are errors where a file is expected. Relative paths are resolved when the
 /// store is created.
 struct TrustedIssuer {
-  /// The text of the tokens' Issuer (SAML 2.0 core, section 2.2.5), compared byte for byte. Several
-  /// entries for one issuer are used together.
+  /// The text of the tokens' Issuer (SAML 2.0 core, section 2.2.5), compared byte for byte. Must
+  /// not be empty unless `isForAnyIssuer`. Several entries for one issuer are used together.
   std::string issuer{};
   /// True, with an empty `issuer`, if the certificates may sign tokens of every issuer: only right
   /// when there is one service, since each could sign in the name of another.
@@ -135,14 +135,14 @@ class SSOCLIENT_ACCESS_EXPORT TrustStore {
   virtual TrustDescription Describe() const = 0;
 };
 
-/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no issuer, an issuer
-/// has neither a certificate nor a path of one, a certificate is null, and when there is no
-/// certificate at all, since a gate would refuse every token, when there are signers of lists but
-/// no path of a list, and when a path is empty or contains a NUL; `Tarnik::IOException` when a path
-/// does not exist or cannot be read, or the files change during each of several readings;
-/// `Tarnik::Crypto::CryptoException` when a file contains no certificate or list, or one that
-/// cannot be used; `Tarnik::ResourceException` when the system has too few descriptors. A message
-/// about a file names it.
+/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no entry for an issuer,
+/// an entry names no issuer without `isForAnyIssuer`, or one with it, an entry has neither a
+/// certificate nor a path of one, a certificate is null, there is no certificate at all, since a
+/// gate would refuse every token, there are signers of lists but no path of a list, and when a path
+/// is empty or contains a NUL; `Tarnik::IOException` when a path does not exist or cannot be read,
+/// or the files change during each of several readings; `Tarnik::Crypto::CryptoException` when a
+/// file contains no certificate or list, or one that cannot be used; `Tarnik::ResourceException`
+/// when the system has too few descriptors. A message about a file names it.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustStore> CreateTrustStore(TrustStoreConfig config);
 
 }  // namespace SsoClient::Access

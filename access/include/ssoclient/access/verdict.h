@@ -95,8 +95,8 @@ struct VerdictFacts;
 class SSOCLIENT_ACCESS_EXPORT Verdict {
  public:
   bool IsAccepted() const noexcept;
-  /// The accepted token; null when it was refused. The gate reads tokens with the widest clock
-  /// tolerance: their `ExpirationTimeWithTolerance` is of no use.
+  /// The accepted token; null when it was refused. Its `ExpirationTimeWithTolerance` has the
+  /// tolerance of the gate (`GateConfig::clockTolerance`).
   const std::shared_ptr<const SamlToken>& Token() const noexcept;
   /// `Reason::kNone` for an accepted token.
   Reason Refusal() const noexcept;
@@ -114,7 +114,7 @@ class SSOCLIENT_ACCESS_EXPORT Verdict {
   /// have passed, or none has been reached. Throw `Tarnik::InvalidArgumentException` for null and
   /// for `Reason::kNone`.
   static Verdict Accept(std::shared_ptr<const SamlToken> token);
-  static Verdict Refuse(Reason reason, std::string message);
+  static Verdict Refuse(Reason reason, const std::string& message);
 
   /// For the library.
   explicit Verdict(std::shared_ptr<const VerdictFacts> facts) noexcept;

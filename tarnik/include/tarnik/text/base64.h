@@ -7,6 +7,8 @@
 
 namespace Tarnik {
 
+// `StringUtil::Base64Decode` (tarnik/text/string_util.h) decodes.
+
 /// Length in characters of the Base64 text of `length` bytes at `data`: four for each group of
 /// three or fewer bytes, without line breaks and without a terminating NUL. Throws
 /// `InvalidArgumentException` when `data` is null and `length` is not 0, and when the length of the
