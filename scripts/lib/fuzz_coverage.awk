@@ -1,5 +1,5 @@
-# Reads lcov's format and prints the line coverage of each folder of src and tarnik/src. Fails if a folder of `minima`,
-# such as "src/token=95 src/xml=95", is below its percentage, and then lists its files.
+# Reads lcov's format and prints the line coverage of each folder of src, tarnik/src and access/src. Fails if a folder of
+# `minima`, such as "src/token=95 src/xml=95", is below its percentage, and then lists its files.
 
 # Compilers keep paths as they are given, such as /tree/build/coverage/../../src/token/principal_id.cpp.
 function normalised(path) {
@@ -23,9 +23,9 @@ BEGIN {
   file = normalised(substr($0, 4))
   isOurs = index(file, root) == 1
   file = isOurs ? substr(file, length(root) + 1) : ""
-  isOurs = file ~ /^(src|tarnik\/src)\/[^\/]+\//
+  isOurs = file ~ /^(src|tarnik\/src|access\/src)\/[^\/]+\//
   folder = file
-  match(folder, /^(src|tarnik\/src)\/[^\/]+/)
+  match(folder, /^(src|tarnik\/src|access\/src)\/[^\/]+/)
   folder = substr(folder, 1, RLENGTH)
 }
 
