@@ -31,14 +31,16 @@ struct TrustedIssuer {
   /// when there is one service, since each could sign in the name of another.
   bool isForAnyIssuer = false;
   /// The certificates of the signing keys themselves. A certificate that one of them has issued is
-  /// not trusted.
+  /// not trusted. Of the certificates that a token's KeyInfo may mean, the first 16 are tried; that
+  /// matters only if it names none, so that it may mean all.
   std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>> certificates{};
   std::vector<std::string> certificatePaths{};
   /// Certificate revocation lists (RFC 5280, section 5). Without paths, revocation is not checked.
   /// With them, each of the certificates must be covered by a list of its issuer that is not out of
   /// date, or no token that it signed is accepted: also when a folder contains no list yet. Of
   /// several lists that cover a certificate, the one with the latest thisUpdate counts, and all of
-  /// them if they have the same. A certificate in several entries of an issuer is checked if one of
+  /// them if they have the same. A certificate on it is revoked even if the date of its revocation
+  /// is in the future, and also after the list is out of date. A certificate in several entries of an issuer is checked if one of
   /// them has lists, against the lists of all.
   std::vector<std::string> revocationListPaths{};
   /// The certificates of the authorities that sign these lists. They are not trusted to sign
