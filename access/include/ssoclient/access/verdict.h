@@ -15,7 +15,8 @@ enum class CheckKind {
   kSize,           ///< the length of the text
   kWellFormed,     ///< XML, as `Tarnik::Xml::XMLParser` accepts it
   kLayout,         ///< one assertion of the accepted structure (`CreateSamlToken`)
-  kValidity,       ///< NotBefore and NotOnOrAfter of its Conditions
+  kValidity,       ///< NotBefore and NotOnOrAfter of its Conditions, and NotOnOrAfter of its
+                   ///< SubjectConfirmationData
   kSignerKnown,    ///< its KeyInfo names a certificate that is trusted for its issuer
   kSignerValid,    ///< the validity of that certificate
   kSignerRevoked,  ///< that certificate is not revoked
@@ -95,8 +96,7 @@ struct VerdictFacts;
 class SSOCLIENT_ACCESS_EXPORT Verdict {
  public:
   bool IsAccepted() const noexcept;
-  /// The accepted token; null when it was refused. The gate reads tokens with the widest clock
-  /// tolerance: their `ExpirationTimeWithTolerance` is of no use.
+  /// The accepted token; null when it was refused. Its clock tolerance is the gate's.
   const std::shared_ptr<const SamlToken>& Token() const noexcept;
   /// `Reason::kNone` for an accepted token.
   Reason Refusal() const noexcept;
