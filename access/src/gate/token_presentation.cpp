@@ -112,7 +112,7 @@ CheckResult TokenPresentation::Read(const std::string& text) {
 
 CheckResult TokenPresentation::CheckTrust(const Key& key) {
   const CheckedToken& checked = *facts_->checked;
-  if (const Reason reason = CheckValidity(*checked.token, clock_); reason != Reason::kNone) {
+  if (const Reason reason = CheckValidity(checked, clock_); reason != Reason::kNone) {
     if (key && facts_->isRemembered && reason == Reason::kExpired) {
       remembered_.Remove(*key, checked);
     }

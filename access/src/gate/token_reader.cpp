@@ -11,6 +11,7 @@
 #include <tarnik/text/display_text.h>
 #include <tarnik/xml/xml_parse_exception.h>
 
+#include "gate/confirmation_end.h"
 #include "gate/tolerant_token.h"
 
 namespace SsoClient::Access {
@@ -61,6 +62,7 @@ TokenTraits TraitsOf(const SamlToken& token, const GateConfig& config) {
   std::vector<Delegate> chain;
   token.GetDelegationChain(chain);
   TokenTraits traits;
+  traits.confirmationEnd = ConfirmationEndOf(token);
   traits.audience = FindAudience(audiences, config.audiences);
   traits.group = FindGroup(token, config.allowedGroups);
   traits.delegates = chain.size();

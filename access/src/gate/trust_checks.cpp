@@ -46,11 +46,14 @@ Reason CheckSignerKnown(const CheckedToken& checked, Signers& signers) {
 
 }  // namespace
 
-Reason CheckValidity(const SamlToken& token, const ClockRules& clock) {
+Reason CheckValidity(const CheckedToken& checked, const ClockRules& clock) {
+  const SamlToken& token = *checked.token;
   if (!clock.HasBegun(token.StartTime())) {
     return Reason::kNotYetValid;
   }
-  return clock.HasEnded(token.ExpirationTime()) ? Reason::kExpired : Reason::kNone;
+  const bool hasEnded =
+      clock.HasEnded(token.ExpirationTime()) || clock.HasEnded(checked.traits.confirmationEnd);
+  return hasEnded ? Reason::kExpired : Reason::kNone;
 }
 
 CheckResult CheckSigner(CheckedToken& checked, const ClockRules& clock, std::string& detail) {

@@ -13,8 +13,8 @@ struct CheckResult {
   Reason reason = Reason::kNone;
 };
 
-/// NotBefore and NotOnOrAfter.
-Reason CheckValidity(const SamlToken& token, const ClockRules& clock);
+/// NotBefore and NotOnOrAfter of the Conditions, and the end of the confirmation.
+Reason CheckValidity(const CheckedToken& checked, const ClockRules& clock);
 
 /// The checks of the signer and the signature of a token that has just been read, with its `trust`.
 /// Sets its `signer` when the signature verifies, and otherwise may set `detail`.

@@ -56,7 +56,11 @@ std::string RevocationText(const VerdictFacts& facts, const Signer& signer) {
 
 std::string ValidityText(const VerdictFacts& facts) {
   const SamlToken& token = *facts.checked->token;
-  return PeriodText(facts, token.StartTime(), token.ExpirationTime());
+  const std::string period = PeriodText(facts, token.StartTime(), token.ExpirationTime());
+  const auto& end = facts.checked->traits.confirmationEnd;
+  return end < token.ExpirationTime()
+             ? period + "; its subject can be confirmed until " + end.ToString()
+             : period;
 }
 
 std::string SignerKnownText(const VerdictFacts& facts) {

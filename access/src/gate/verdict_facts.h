@@ -14,10 +14,12 @@
 
 namespace SsoClient::Access {
 
-/// What the policy of a gate says about a token at any time. Pointers are to the configuration.
+/// What a token says that its interface does not, and what the policy of a gate says about it at
+/// any time. Pointers are to the configuration.
 struct TokenTraits {
-  const std::string* audience = nullptr;  ///< the gate's, which the token names
-  const PrincipalId* group = nullptr;     ///< the allowed group, which the subject is in
+  Tarnik::System::DateTime confirmationEnd;  ///< see `ConfirmationEndOf`
+  const std::string* audience = nullptr;     ///< the gate's, which the token names
+  const PrincipalId* group = nullptr;        ///< the allowed group, which the subject is in
   std::size_t delegates = 0;
   bool isRestricted = false;  ///< to audiences
 };

@@ -66,6 +66,26 @@ TEST_F(GateTimesTest, EndOfToken) {
   EXPECT_EQ(ReasonAt(end), Reason::kExpired);
 }
 
+// It may end before the token does.
+TEST_F(GateTimesTest, EndOfConfirmation) {
+  const auto confirmed = After(start, seconds(600));
+  AssertionText changed = HolderOfKeyText();
+  changed.subject = Replaced(changed.subject, end.ToString(), confirmed.ToString());
+  const std::string holderOfKey = Signed(changed);
+  const auto holder = Presenter::WithTlsCertificate(CertificateOf(HolderCredential()));
+  const auto gate = Make();
+  ExpectAccepted(gate->Check(holderOfKey, holder));
+  now = After(confirmed, kTolerance - kInstant);
+  ExpectAccepted(gate->Check(holderOfKey, holder));
+  EXPECT_EQ(gate->Metrics().cacheHits, 1U);
+  now = After(confirmed, kTolerance);
+  ExpectRefused(gate->Check(holderOfKey, holder), Reason::kExpired, CheckKind::kValidity);
+  const Verdict verdict = Check(holderOfKey, holder);
+  ExpectRefused(verdict, Reason::kExpired, CheckKind::kValidity);
+  EXPECT_NE(verdict.Message().find("can be confirmed until " + confirmed.ToString()),
+            std::string::npos);
+}
+
 TEST_F(GateTimesTest, BeginOfSigner) {
   signer.notBefore = start;
   Trust(signer);

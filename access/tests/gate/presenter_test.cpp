@@ -1,3 +1,5 @@
+#include <utility>
+
 #include <gtest/gtest.h>
 
 #include <ssoclient/access/presenter.h>
@@ -29,6 +31,13 @@ TEST(PresenterTest, Signature) {
   EXPECT_EQ(presenter.Data(), "data");
   EXPECT_EQ(presenter.Signature(), (std::vector<unsigned char>{1, 2}));
   EXPECT_EQ(presenter.Algorithm(), algorithm);
+}
+
+TEST(PresenterTest, MovedFromProvesNothing) {
+  Presenter presenter = Presenter::WithTlsCertificate(Tarnik::MakeRef<NamedCertificate>("name"));
+  const Presenter moved = std::move(presenter);
+  EXPECT_EQ(moved.GetKind(), Presenter::Kind::kTlsCertificate);
+  EXPECT_EQ(presenter.GetKind(), Presenter::Kind::kNobody);
 }
 
 }  // namespace

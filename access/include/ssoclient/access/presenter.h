@@ -13,7 +13,7 @@ namespace SsoClient::Access {
 
 /// What a server knows about the sender of a token, which is compared with the key that a
 /// holder-of-key token is bound to (SAML 2.0 profiles, section 3.1). A value; thread-safe as one.
-/// One that was moved from may only be assigned to and destroyed.
+/// One that was moved from proves nothing.
 class SSOCLIENT_ACCESS_EXPORT Presenter {
  public:
   /// What the server knows.
@@ -37,7 +37,9 @@ class SSOCLIENT_ACCESS_EXPORT Presenter {
   static Presenter WithSignature(std::string data, std::vector<unsigned char> signature,
                                  Tarnik::Crypto::SignatureAlgorithm algorithm);
 
-  Kind GetKind() const noexcept { return kind_; }
+  Kind GetKind() const noexcept {
+    return kind_ == Kind::kTlsCertificate && certificate_ == nullptr ? Kind::kNobody : kind_;
+  }
   /// Null unless the kind is `kTlsCertificate`.
   const Tarnik::Ref<const Tarnik::Crypto::Certificate>& Certificate() const noexcept {
     return certificate_;

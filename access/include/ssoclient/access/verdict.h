@@ -15,7 +15,8 @@ enum class CheckKind {
   kSize,           ///< the length of the text
   kWellFormed,     ///< XML, as `Tarnik::Xml::XMLParser` accepts it
   kLayout,         ///< one assertion of the accepted structure (`CreateSamlToken`)
-  kValidity,       ///< NotBefore and NotOnOrAfter of its Conditions
+  kValidity,       ///< NotBefore and NotOnOrAfter of its Conditions, and NotOnOrAfter of its
+                   ///< SubjectConfirmationData
   kSignerKnown,    ///< its KeyInfo names a certificate that is trusted for its issuer
   kSignerValid,    ///< the validity of that certificate
   kSignerRevoked,  ///< that certificate is not revoked
