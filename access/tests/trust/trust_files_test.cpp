@@ -7,7 +7,6 @@
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 
 #include <tarnik/core/exception.h>
@@ -121,13 +120,11 @@ TEST_F(TrustFilesTest, WhatTheListingSaysIsRefusedBeforeAFileIsRead) {
 TEST_F(TrustFilesTest, TooFewDescriptorsAreAShortage) {
   Put("trust/a.pem", "a");
   const TrustListing listing = ListFiles(config.issuers);
-  rlimit before{};
-  getrlimit(RLIMIT_NOFILE, &before);
-  rlimit none = before;
-  none.rlim_cur = 0;
-  setrlimit(RLIMIT_NOFILE, &none);
-  const std::string message = MessageOf<Tarnik::ResourceException>([&] { ReadFiles(listing); });
-  setrlimit(RLIMIT_NOFILE, &before);
+  std::string message;
+  {
+    const DescriptorShortage shortage;
+    message = MessageOf<Tarnik::ResourceException>([&] { ReadFiles(listing); });
+  }
   EXPECT_EQ(WithoutRoot(message),
             "The trust file '/trust/a.pem' cannot be read: Too many open files.");
   EXPECT_EQ(ReadFiles(listing).entries.size(), 1U);

@@ -35,6 +35,16 @@ Names SignersOf(const TrustSnapshot& trust, const std::string& issuer) {
   return names;
 }
 
+DescriptorShortage::DescriptorShortage() {
+  const auto fail = [] { throw Tarnik::ResourceException("a shortage"); };
+  EXPECT_EQ(MessageOf<Tarnik::ResourceException>(fail), "a shortage");
+  EXPECT_EQ(MessageOf<Tarnik::Exception>(fail), "a shortage");
+  getrlimit(RLIMIT_NOFILE, &before_);
+  rlimit none = before_;
+  none.rlim_cur = 0;
+  setrlimit(RLIMIT_NOFILE, &none);
+}
+
 TrustFixture::TrustFixture() {
   std::filesystem::create_directory(PathOf("trust"));
   Put("trust/a.pem", Sts(0).Pem());

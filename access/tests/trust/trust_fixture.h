@@ -6,6 +6,7 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 
 #include <ssoclient/access/trust_store.h>
 
@@ -50,6 +51,19 @@ std::string MessageOf(const Action& action) {
   }
   return "nothing";
 }
+
+/// During its lifetime this process can open no descriptor. UndefinedBehaviorSanitizer needs one to
+/// look at the first object of a type, so it is shown the exception of a shortage before.
+class DescriptorShortage {
+ public:
+  DescriptorShortage();
+  ~DescriptorShortage() { setrlimit(RLIMIT_NOFILE, &before_); }
+  DescriptorShortage(const DescriptorShortage&) = delete;
+  DescriptorShortage& operator=(const DescriptorShortage&) = delete;
+
+ private:
+  rlimit before_{};
+};
 
 /// A store of the folder "trust" below a temporary one, with virtual time.
 class TrustFixture : public ::testing::Test {

@@ -8,7 +8,6 @@
 #include <utility>
 
 #include <gtest/gtest.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 
 #include <tarnik/core/exception.h>
@@ -295,13 +294,10 @@ TEST_F(TrustWatchTest, ShortageIsReportedOnceAndPassesWithoutAChange) {
   config.issuers[0].certificatePaths = {PathOf("trust/a.pem")};
   MakeSettled();
   Put("trust/a.pem", Sts(1).Pem());
-  rlimit before{};
-  getrlimit(RLIMIT_NOFILE, &before);
-  rlimit none = before;
-  none.rlim_cur = 0;
-  setrlimit(RLIMIT_NOFILE, &none);
-  runtime->Advance(std::chrono::seconds(10));
-  setrlimit(RLIMIT_NOFILE, &before);
+  {
+    const DescriptorShortage shortage;
+    runtime->Advance(std::chrono::seconds(10));
+  }
   EXPECT_EQ(Failure(), "The trust file '/trust/a.pem' cannot be read: Too many open files.");
   EXPECT_EQ(listener->kept.size(), 1U);
   EXPECT_EQ(Signers(), Names{"CN=sts-0"});
