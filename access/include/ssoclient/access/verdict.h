@@ -111,8 +111,8 @@ class SSOCLIENT_ACCESS_EXPORT Verdict {
   std::string ToString() const;
 
   /// Verdicts for implementations of `TokenGate` of a program's own. In their ledgers, all checks
-  /// have passed, or none has been reached, and `compared` is empty. Throw `Tarnik::InvalidArgumentException` for null and
-  /// for `Reason::kNone`.
+  /// have passed, or none has been reached, and `compared` is empty. Throw
+  /// `Tarnik::InvalidArgumentException` for null and for `Reason::kNone`.
   static Verdict Accept(std::shared_ptr<const SamlToken> token);
   static Verdict Refuse(Reason reason, const std::string& message);
 
