@@ -5,6 +5,7 @@
 
 #include <ssoclient/access/call_context.h>
 #include <ssoclient/access/failure_kind.h>
+#include <ssoclient/access/token_gate.h>
 #include <ssoclient/access/token_source.h>
 #include <ssoclient/ssoclient.h>
 
@@ -60,12 +61,60 @@ bool RefusesASourceWithoutEndpoints() {
   return false;
 }
 
+using SsoClient::Access::Verdict;
+
+/// A gate of the program's own, as its tests may have one.
+class ClosedGate final : public SsoClient::Access::TokenGate {
+ public:
+  Verdict Check(const std::string& /*token*/,
+                const SsoClient::Access::Presenter& /*presenter*/) const override {
+    return Verdict::Refuse(SsoClient::Access::Reason::kExpired, "It is late.");
+  }
+  SsoClient::Access::GateMetrics Metrics() const override { return {}; }
+};
+
+bool ImplementsAGate() {
+  const ClosedGate closed;
+  const SsoClient::Access::TokenGate& gate = closed;
+  const Verdict verdict = gate.Check("", SsoClient::Access::Presenter::Nobody());
+  return !verdict.IsAccepted() && verdict.Token() == nullptr && gate.Metrics().accepted == 0 &&
+         RemedyOf(verdict.Refusal()) == SsoClient::Access::Remedy::kNewToken &&
+         verdict.ToString().rfind("refused (expired): It is late.\n", 0) == 0;
+}
+
+bool RefusesAGateWithoutTrust() {
+  try {
+    SsoClient::Access::CreateTokenGate({});
+  } catch (const Tarnik::InvalidArgumentException& e) {
+    return std::string(e.what()) == "The trust store is null.";
+  }
+  return false;
+}
+
+bool RefusesATrustStoreWithoutFiles() {
+  SsoClient::Access::TrustStoreConfig config;
+  config.issuers.resize(1);
+  config.issuers[0].issuer = "https://sts.example.com/STS";
+  config.issuers[0].certificatePaths = {"/nonexistent/sts.pem"};
+  config.listener = SsoClient::Access::CreateTrustLogListener();
+  try {
+    SsoClient::Access::CreateTrustStore(config);
+  } catch (const Tarnik::IOException& e) {
+    return std::string(e.what()).find("/nonexistent/sts.pem") != std::string::npos;
+  }
+  return false;
+}
+
 }  // namespace
 
 int main() {
   if (!ClassifiesRefusedLogins() || !ReportsCancellation() || !ReportsAnUnreachableEndpoint() ||
       !RefusesASourceWithoutEndpoints()) {
     std::cerr << "The installed library of token sources does not work as expected.\n";
+    return 1;
+  }
+  if (!ImplementsAGate() || !RefusesAGateWithoutTrust() || !RefusesATrustStoreWithoutFiles()) {
+    std::cerr << "The installed library of token gates does not work as expected.\n";
     return 1;
   }
   std::cout << "The installed library of token sources works.\n";

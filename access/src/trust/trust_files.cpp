@@ -68,14 +68,9 @@ std::uint64_t ToNanoseconds(const timespec& time) noexcept {
          static_cast<std::uint64_t>(time.tv_nsec);
 }
 
-FileState Look(std::string path) {
+FileState StateOf(std::string path, const struct stat& found) {
   FileState state;
   state.path = std::move(path);
-  struct stat found {};
-  if (stat(state.path.c_str(), &found) != 0) {
-    state.error = errno;
-    return state;
-  }
   state.device = found.st_dev;
   state.inode = found.st_ino;
   state.mode = found.st_mode;
@@ -84,6 +79,17 @@ FileState Look(std::string path) {
     state.modified = ToNanoseconds(found.st_mtim);
     state.changed = ToNanoseconds(found.st_ctim);
   }
+  return state;
+}
+
+FileState Look(std::string path) {
+  struct stat found {};
+  if (stat(path.c_str(), &found) == 0) {
+    return StateOf(std::move(path), found);
+  }
+  FileState state;
+  state.error = errno;
+  state.path = std::move(path);
   return state;
 }
 
@@ -165,7 +171,9 @@ void RequireReadable(const std::vector<PathState>& paths) {
   }
 }
 
-std::string ReadContent(const std::string& path) {
+// Sets `isListed` to false when the file is not the one of `listed`.
+std::string ReadContent(const FileState& listed, bool& isListed) {
+  const std::string& path = listed.path;
   // A pipe or a device that has taken the place of the file must not block.
   const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
   struct stat found {};
@@ -175,6 +183,7 @@ std::string ReadContent(const std::string& path) {
   if (!S_ISREG(found.st_mode)) {
     ThrowUnfit(path, "it is not a regular file.");
   }
+  isListed = isListed && StateOf(path, found) == listed;
   std::string bytes;
   std::array<char, 16384> buffer;
   for (;;) {
@@ -201,7 +210,7 @@ class ContentReader {
     std::vector<FileContent> contents;
     for (const PathState& path : paths) {
       for (const FileState& file : path.files) {
-        contents.push_back({file.path, ReadContent(file.path)});
+        contents.push_back({file.path, ReadContent(file, isOfListing_)});
         Add(contents.back().path);
         Add(contents.back().bytes);
       }
@@ -210,6 +219,8 @@ class ContentReader {
     identity_ += '|';
     return contents;
   }
+
+  bool IsOfListing() const noexcept { return isOfListing_; }
 
   std::string Digest() const {
     const auto digest = Tarnik::Crypto::Sha256(identity_);
@@ -224,6 +235,7 @@ class ContentReader {
   }
 
   std::string identity_;
+  bool isOfListing_ = true;
 };
 
 }  // namespace
@@ -254,6 +266,7 @@ TrustContents ReadFiles(const TrustListing& listing) {
     read.listSigners = reader.Read(entry.listSigners);
   }
   contents.digest = reader.Digest();
+  contents.isOfListing = reader.IsOfListing();
   return contents;
 }
 
@@ -268,7 +281,8 @@ TrustContents ReadUnchanged(const std::vector<TrustedIssuer>& issuers, TrustList
       failure = error.Clone();
     }
     TrustListing after = ListFiles(issuers);
-    if (after == listing) {
+    // A folder may have been replaced by another one and put back in between.
+    if (after == listing && (failure != nullptr || contents.isOfListing)) {
       if (failure != nullptr) {
         failure->Throw();
       }

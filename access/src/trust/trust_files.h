@@ -68,6 +68,8 @@ struct TrustContents {
   std::vector<Entry> entries;
   /// Differs when any path or content does (SHA-256).
   std::string digest;
+  /// False when a file had been replaced or changed after it was listed.
+  bool isOfListing = true;
 };
 
 /// The largest file that is read.
@@ -79,7 +81,8 @@ inline constexpr std::uint64_t kLargestTrustFile = std::uint64_t{16} * 1024 * 10
 TrustContents ReadFiles(const TrustListing& listing);
 
 /// Reads all files as they are at one moment: lists them before and after, and reads again when
-/// anything has changed in between. `listing` is set also when this throws.
+/// anything has changed in between, or a file that was read is not the one that was listed.
+/// `listing` is set also when this throws.
 ///
 /// Throws as above, and `Tarnik::IOException` when the files do not stay the same for long enough.
 TrustContents ReadUnchanged(const std::vector<TrustedIssuer>& issuers, TrustListing& listing);

@@ -117,6 +117,22 @@ TEST_F(TrustFilesTest, WhatTheListingSaysIsRefusedBeforeAFileIsRead) {
             "The trust file '/missing' cannot be read: No such file or directory.");
 }
 
+// As when a link leads elsewhere while files are read, and back before they are listed again.
+TEST_F(TrustFilesTest, FileThatIsNotTheListedOneIsNoticed) {
+  for (const std::string folder : {"first", "second"}) {
+    std::filesystem::create_directory(PathOf(folder));
+    Put(folder + "/a.pem", "a");
+  }
+  std::filesystem::create_directory_symlink(PathOf("first"), PathOf("link"));
+  config.issuers[0].certificatePaths = {PathOf("link")};
+  const TrustListing listing = ListFiles(config.issuers);
+  EXPECT_TRUE(ReadFiles(listing).isOfListing);
+  std::filesystem::create_directory_symlink(PathOf("second"), PathOf("next"));
+  Rename("next", "link");
+  EXPECT_FALSE(ReadFiles(listing).isOfListing);
+  EXPECT_TRUE(Read().isOfListing);
+}
+
 TEST_F(TrustFilesTest, TooFewDescriptorsAreAShortage) {
   Put("trust/a.pem", "a");
   const TrustListing listing = ListFiles(config.issuers);
