@@ -78,7 +78,7 @@ CheckResult TokenPresentation::CheckAll(const std::string& text, const Presenter
   }
   const CheckResult result = CheckPolicy(*facts_->checked, presenter, facts_->detail);
   if (result.reason == Reason::kNone && !facts_->isRemembered && key) {
-    remembered_.Insert(*key, read_->trust->Version(), facts_->checked, MemoryOf(text.size()));
+    remembered_.Insert(*key, read_->trust->Version(), facts_->checked, MemoryOf(text));
   }
   return result;
 }
