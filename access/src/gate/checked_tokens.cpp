@@ -28,8 +28,9 @@ std::size_t Part(std::size_t total, std::size_t index, std::size_t count) noexce
 
 }  // namespace
 
-std::size_t MemoryOf(std::size_t length) noexcept {
-  return length * 9 / 2 + 1024;
+std::size_t MemoryOf(std::string_view text) noexcept {
+  const auto marks = static_cast<std::size_t>(std::count(text.begin(), text.end(), '<'));
+  return 1024 + 3 * text.size() + 72 * marks;
 }
 
 CheckedTokens::CheckedTokens(const GateCacheConfig& config) : shards_(CountShards(config)) {

@@ -7,6 +7,7 @@
 #include <list>
 #include <memory>
 #include <mutex>
+#include <string_view>
 #include <unordered_map>
 #include <vector>
 
@@ -17,8 +18,9 @@
 
 namespace SsoClient::Access {
 
-/// The memory of a remembered token with a text of this length, as it is counted.
-std::size_t MemoryOf(std::size_t length) noexcept;
+/// The memory of a remembered token with this text, as it is counted. The nodes of its document are
+/// counted by their marks, since the presenter may add comments of a few bytes to any token.
+std::size_t MemoryOf(std::string_view text) noexcept;
 
 /// The tokens that a gate has accepted, by the SHA-256 of their texts. Thread-safe: the tokens are
 /// in a few shards, each with a lock that is held for a look-up. What is removed is destroyed
@@ -51,7 +53,8 @@ class CheckedTokens {
     std::size_t bytes;
   };
   using Entries = std::list<Entry>;
-  // The digests cannot be chosen by whoever writes tokens, since only accepted tokens are kept.
+  // Whoever has an accepted token can change its digest, by white space around it for example, but
+  // a shard has too few entries for collisions to matter.
   struct KeyHash {
     std::size_t operator()(const Key& key) const noexcept {
       std::size_t hash = 0;

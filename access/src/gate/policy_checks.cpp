@@ -31,15 +31,16 @@ struct Presentation {
   bool IsBearer() const { return token.ConfirmationType() == BEARER; }
 };
 
-Reason CheckAudience(const Presentation& now) {
-  if (!now.checked.traits.isRestricted) {
-    return now.config.acceptsUnrestrictedTokens ? Reason::kNone : Reason::kUnrestricted;
+Reason CheckAudience(const Presentation& presented) {
+  if (!presented.checked.traits.isRestricted) {
+    return presented.config.acceptsUnrestrictedTokens ? Reason::kNone : Reason::kUnrestricted;
   }
-  return now.checked.traits.audience != nullptr ? Reason::kNone : Reason::kWrongAudience;
+  return presented.checked.traits.audience != nullptr ? Reason::kNone : Reason::kWrongAudience;
 }
 
-Reason CheckConfirmation(const Presentation& now) {
-  const bool isWelcome = !now.IsBearer() || now.config.bearerTokens == BearerTokens::kAccept;
+Reason CheckConfirmation(const Presentation& presented) {
+  const bool isWelcome =
+      !presented.IsBearer() || presented.config.bearerTokens == BearerTokens::kAccept;
   return isWelcome ? Reason::kNone : Reason::kBearerRefused;
 }
 
@@ -53,63 +54,64 @@ bool Proves(const Presenter& presenter, const Tarnik::Crypto::Certificate& holde
                                     presenter.Signature());
 }
 
-Reason CheckPossession(const Presentation& now) {
-  if (now.IsBearer()) {
+Reason CheckPossession(const Presentation& presented) {
+  if (presented.IsBearer()) {
     return Reason::kNone;
   }
-  if (now.presenter.GetKind() == Presenter::Kind::kNobody) {
+  if (presented.presenter.GetKind() == Presenter::Kind::kNobody) {
     return Reason::kNoProof;
   }
   try {
-    const auto holder = now.token.HolderOfKeyCertificate();
-    return holder != nullptr && Proves(now.presenter, *holder) ? Reason::kNone
-                                                               : Reason::kWrongProof;
+    const auto holder = presented.token.HolderOfKeyCertificate();
+    return holder != nullptr && Proves(presented.presenter, *holder) ? Reason::kNone
+                                                                     : Reason::kWrongProof;
   } catch (const Tarnik::Exception& e) {
-    now.detail = Tarnik::ToDisplayText(e.Message(), kMaxProofFailure);
+    presented.detail = Tarnik::ToDisplayText(e.Message(), kMaxProofFailure);
     return Reason::kWrongProof;
   }
 }
 
-Reason CheckLifetime(const Presentation& now) {
+Reason CheckLifetime(const Presentation& presented) {
   // Both are in the range of `DateTime`, so that their difference does not overflow.
-  const std::chrono::microseconds lifetime(now.token.ExpirationTime().GetUtcTime() -
-                                           now.token.StartTime().GetUtcTime());
-  return lifetime <= now.config.longestLifetime ? Reason::kNone : Reason::kTooLongLived;
+  const std::chrono::microseconds lifetime(presented.token.ExpirationTime().GetUtcTime() -
+                                           presented.token.StartTime().GetUtcTime());
+  return lifetime <= presented.config.longestLifetime ? Reason::kNone : Reason::kTooLongLived;
 }
 
-Reason CheckDelegation(const Presentation& now) {
-  return now.checked.traits.delegates <= now.config.deepestDelegation ? Reason::kNone
-                                                                      : Reason::kTooDeeplyDelegated;
+Reason CheckDelegation(const Presentation& presented) {
+  return presented.checked.traits.delegates <= presented.config.deepestDelegation
+             ? Reason::kNone
+             : Reason::kTooDeeplyDelegated;
 }
 
-Reason CheckGroups(const Presentation& now) {
-  return now.config.allowedGroups.empty() || now.checked.traits.group != nullptr
+Reason CheckGroups(const Presentation& presented) {
+  return presented.config.allowedGroups.empty() || presented.checked.traits.group != nullptr
              ? Reason::kNone
              : Reason::kNotInGroup;
 }
 
-Reason CallPredicate(const Presentation& now) {
+Reason CallPredicate(const Presentation& presented) {
   std::string why;
-  if (now.config.predicate(now.token, why)) {
+  if (presented.config.predicate(presented.token, why)) {
     return Reason::kNone;
   }
-  now.detail = ToRecordText(why);
+  presented.detail = ToRecordText(why);
   return Reason::kRefusedByPredicate;
 }
 
-Reason CheckPredicate(const Presentation& now) {
-  if (!now.config.predicate) {
+Reason CheckPredicate(const Presentation& presented) {
+  if (!presented.config.predicate) {
     return Reason::kNone;
   }
   try {
-    return CallPredicate(now);
+    return CallPredicate(presented);
   } catch (const std::exception& e) {
     const char* const what = e.what();
-    now.detail = ToRecordText(what != nullptr ? what : "");
+    presented.detail = ToRecordText(what != nullptr ? what : "");
   } catch (const abi::__forced_unwind&) {
     throw;  // the thread is being cancelled
   } catch (...) {
-    now.detail = "an exception that is not a std::exception";
+    presented.detail = "an exception that is not a std::exception";
   }
   return Reason::kPredicateFailed;
 }
@@ -130,9 +132,9 @@ constexpr PolicyCheck kPolicyChecks[] = {
 
 CheckResult CheckPolicy(const CheckedToken& checked, const Presenter& presenter,
                         std::string& detail) {
-  const Presentation now{*checked.config, checked, *checked.token, presenter, detail};
+  const Presentation presented{*checked.config, checked, *checked.token, presenter, detail};
   for (const PolicyCheck& policy : kPolicyChecks) {
-    if (const Reason reason = policy.check(now); reason != Reason::kNone) {
+    if (const Reason reason = policy.check(presented); reason != Reason::kNone) {
       return {policy.kind, reason};
     }
   }

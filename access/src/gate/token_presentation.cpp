@@ -78,7 +78,7 @@ CheckResult TokenPresentation::CheckAll(const std::string& text, const Presenter
   }
   const CheckResult result = CheckPolicy(*facts_->checked, presenter, facts_->detail);
   if (result.reason == Reason::kNone && !facts_->isRemembered && key) {
-    remembered_.Insert(*key, read_->trust->Version(), facts_->checked, MemoryOf(text.size()));
+    remembered_.Insert(*key, read_->trust->Version(), facts_->checked, MemoryOf(text));
   }
   return result;
 }
@@ -118,9 +118,10 @@ CheckResult TokenPresentation::CheckTrust(const Key& key) {
     }
     return {CheckKind::kValidity, reason};
   }
-  // A remembered signer has been checked when the token was recalled.
-  return facts_->isRemembered ? CheckSignerAgain(*checked.signer, clock_)
-                              : CheckSigner(*read_, clock_, facts_->detail);
+  if (facts_->isRemembered) {
+    return {CheckKind::kSignature, Reason::kNone};  // `Recall` has checked the signer
+  }
+  return CheckSigner(*read_, clock_, facts_->detail);
 }
 
 }  // namespace SsoClient::Access

@@ -72,7 +72,7 @@ std::string SignerKnownText(const VerdictFacts& facts) {
   }
   const Signers signers = SelectSigners(*checked.trust, *checked.token);
   return "issuer " + ShownText(name) + "; of " + std::to_string(issuer->signers.size()) +
-         " that may sign for it, the token names " +
+         " that may sign for it, the token may mean " +
          (signers.empty() ? std::string("none") : NamesOf(signers));
 }
 

@@ -33,6 +33,20 @@ CheckRecord RecordOf(const VerdictFacts& facts, CheckKind check) {
   return record;
 }
 
+std::string DecisionText(const VerdictFacts& facts) {
+  const GateConfig* const config = facts.Config();
+  std::string text =
+      config == nullptr || config->name.empty() ? "" : ToRecordText(config->name) + ": ";
+  if (facts.reason == Reason::kNone) {
+    return text.append("accepted\n");
+  }
+  return text.append("refused (")
+      .append(NameOf(facts.reason))
+      .append("): ")
+      .append(facts.message)
+      .append("\n");
+}
+
 }  // namespace
 
 Verdict::Verdict(std::shared_ptr<const VerdictFacts> facts) noexcept : facts_(std::move(facts)) {}
@@ -64,9 +78,7 @@ std::vector<CheckRecord> Verdict::Ledger() const {
 }
 
 std::string Verdict::ToString() const {
-  std::string text = IsAccepted()
-                         ? std::string("accepted\n")
-                         : std::string("refused (") + NameOf(Refusal()) + "): " + Message() + "\n";
+  std::string text = DecisionText(*facts_);
   for (const CheckRecord& record : Ledger()) {
     text.append("  ").append(NameOf(record.check)).append(": ").append(NameOf(record.outcome));
     if (!record.compared.empty()) {

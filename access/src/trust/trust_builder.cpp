@@ -4,6 +4,7 @@
 #include <atomic>
 #include <cstddef>
 #include <map>
+#include <optional>
 #include <string_view>
 #include <utility>
 
@@ -11,6 +12,7 @@
 
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/revocation_list.h>
+#include <tarnik/system/date_time.h>
 #include <tarnik/text/display_text.h>
 
 #include "trust/trust_entry.h"
@@ -23,6 +25,7 @@ using Tarnik::Ref;
 using Tarnik::Crypto::Certificate;
 using Tarnik::Crypto::RevocationList;
 using Tarnik::Crypto::Sha256Digest;
+using Tarnik::System::DateTime;
 using Tarnik::Xml::Security::CertificateCandidatesResolver;
 
 constexpr std::size_t kLongestSubject = 200;
@@ -43,24 +46,52 @@ Signer MakeSigner(const Ref<const Certificate>& certificate) {
   return signer;
 }
 
-// Of several lists the latest one counts; of several of one date, all of them.
-void Consider(const RevocationList& list, Signer& signer) {
-  if (!list.Covers(*signer.certificate)) {
+/// What the lists of one list signer say about a certificate.
+struct ListedState {
+  DateTime from;
+  DateTime until;
+  std::optional<DateTime> revokedSince;
+};
+
+// By the fingerprints of the list signers.
+using ListedStates = std::map<Sha256Digest, ListedState>;
+
+// Of several lists of one list signer the latest one counts; of several of one date, all of them.
+void Consider(const TrustEntry::FoundList& found, const Certificate& certificate,
+              ListedStates& states) {
+  const RevocationList& list = *found.list;
+  if (!list.Covers(certificate)) {
     return;
   }
   const auto from = list.ThisUpdate();
-  if (signer.listFrom && from < *signer.listFrom) {
+  const auto [place, isNew] = states.try_emplace(found.signer);
+  ListedState& state = place->second;
+  if (!isNew && from < state.from) {
     return;
   }
-  if (!signer.listFrom || *signer.listFrom < from) {
-    signer.listFrom = from;
-    signer.listUntil.reset();
-    signer.revokedSince.reset();
+  if (isNew || state.from < from) {
+    state = {from, list.NextUpdate(), std::nullopt};
   }
-  const auto until = list.NextUpdate();
-  signer.listUntil = signer.listUntil ? std::min(*signer.listUntil, until) : until;
-  if (const auto since = list.RevokedSince(*signer.certificate)) {
-    signer.revokedSince = signer.revokedSince ? std::min(*signer.revokedSince, *since) : *since;
+  state.until = std::min(state.until, list.NextUpdate());
+  if (const auto since = list.RevokedSince(certificate)) {
+    state.revokedSince = state.revokedSince ? std::min(*state.revokedSince, *since) : *since;
+  }
+}
+
+// An authority that has changed its key may list what it has issued before by the old key only. So
+// a certificate is revoked if the lists of any list signer say so; the latest ones give the period.
+void Combine(const ListedStates& states, Signer& signer) {
+  for (const auto& [digest, state] : states) {
+    if (!signer.listFrom || *signer.listFrom <= state.from) {
+      const bool isSame = signer.listFrom && *signer.listFrom == state.from;
+      signer.listUntil = isSame ? std::min(*signer.listUntil, state.until) : state.until;
+      signer.listFrom = state.from;
+    }
+    if (state.revokedSince) {
+      signer.revokedSince = signer.revokedSince
+                                ? std::min(*signer.revokedSince, *state.revokedSince)
+                                : *state.revokedSince;
+    }
   }
 }
 
@@ -80,6 +111,7 @@ class IssuerBuilder {
       const auto [place, isNew] = places_.try_emplace(digest, built_.trust.signers.size());
       if (isNew) {
         fingerprints_.insert(digest);
+        states_.emplace_back();
         built_.trust.signers.push_back(MakeSigner(found.certificate));
         if (isOwn) {
           built_.ownPaths.push_back(found.path);
@@ -87,14 +119,17 @@ class IssuerBuilder {
       }
       Signer& signer = built_.trust.signers[place->second];
       signer.isRevocationChecked = signer.isRevocationChecked || entry.isRevocationChecked;
-      for (const auto& list : entry.lists) {
-        Consider(*list, signer);
+      for (const TrustEntry::FoundList& list : entry.lists) {
+        Consider(list, *signer.certificate, states_[place->second]);
       }
     }
   }
 
   BuiltIssuer Build() {
     IssuerTrust& trust = built_.trust;
+    for (std::size_t i = 0; i < states_.size(); ++i) {
+      Combine(states_[i], trust.signers[i]);
+    }
     if (!trust.signers.empty()) {
       std::vector<Ref<const Certificate>> certificates;
       certificates.reserve(trust.signers.size());
@@ -111,6 +146,7 @@ class IssuerBuilder {
   std::set<Sha256Digest>& fingerprints_;
   BuiltIssuer built_;
   std::map<Sha256Digest, std::size_t> places_;
+  std::vector<ListedStates> states_;  // of the signers
 };
 
 BuiltIssuer BuildIssuer(const std::vector<TrustEntry>& entries, std::string_view issuer,

@@ -38,9 +38,12 @@ std::vector<Ref<const Certificate>> DecodeCertificates(const FileContent& file) 
   });
 }
 
-bool IsFromOneOf(const RevocationList& list, const std::vector<Ref<const Certificate>>& signers) {
-  return std::any_of(signers.begin(), signers.end(),
-                     [&list](const auto& signer) { return list.IsFrom(*signer); });
+// Null if it is none of them.
+const Certificate* SignerOf(const RevocationList& list,
+                            const std::vector<Ref<const Certificate>>& signers) {
+  const auto found = std::find_if(signers.begin(), signers.end(),
+                                  [&list](const auto& signer) { return list.IsFrom(*signer); });
+  return found == signers.end() ? nullptr : found->get();
 }
 
 }  // namespace
@@ -69,10 +72,11 @@ TrustEntry DecodeEntry(const TrustedIssuer& issuer, const TrustContents::Entry& 
       return Tarnik::Crypto::CreateRevocationListsFromPemOrDer(bytes);
     });
     for (const auto& list : lists) {
-      if (!IsFromOneOf(*list, listSigners)) {
+      const Certificate* const signer = SignerOf(*list, listSigners);
+      if (signer == nullptr) {
         ThrowUnusable(file.path, "No certificate of the entry has signed the revocation list.");
       }
-      entry.lists.push_back(list);
+      entry.lists.push_back({list, Tarnik::Crypto::Fingerprint(*signer)});
     }
   }
   return entry;

@@ -7,6 +7,7 @@
 #include <ssoclient/access/trust_store.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/digest.h>
 #include <tarnik/crypto/revocation_list.h>
 
 #include "trust/trust_files.h"
@@ -20,10 +21,15 @@ struct TrustEntry {
     std::string path;  ///< empty if it was given as an object
   };
 
+  struct FoundList {
+    Tarnik::Ref<const Tarnik::Crypto::RevocationList> list;
+    /// Of the list signer or certificate of the entry that has signed it.
+    Tarnik::Crypto::Sha256Digest signer;
+  };
+
   std::string issuer;
   std::vector<Found> certificates;
-  /// Signed by a list signer or a certificate of this entry.
-  std::vector<Tarnik::Ref<const Tarnik::Crypto::RevocationList>> lists;
+  std::vector<FoundList> lists;
   bool isRevocationChecked = false;
 };
 

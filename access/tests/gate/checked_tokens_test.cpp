@@ -33,6 +33,13 @@ GateMetrics MetricsOf(const CheckedTokens& tokens) {
   return metrics;
 }
 
+TEST(CheckedTokensTest, MemoryIsCountedByLengthAndMarks) {
+  EXPECT_EQ(MemoryOf(""), 1024U);
+  EXPECT_EQ(MemoryOf("text"), 1036U);
+  EXPECT_EQ(MemoryOf("<a></a>"), 1024U + 3 * 7 + 2 * 72);
+  EXPECT_EQ(MemoryOf("<!---->"), 1024U + 3 * 7 + 72);
+}
+
 TEST(CheckedTokensTest, FindsWhatWasInserted) {
   CheckedTokens tokens({100, 1'000'000});
   const auto token = NewToken();

@@ -32,6 +32,20 @@ class GateHitsTest : public GateFixture {
   const std::string token = Signed(text);
 };
 
+// A presenter can add comments to any token. Each takes up to 64 bytes of memory.
+TEST_F(GateHitsTest, CommentsCountAsMemory) {
+  constexpr std::size_t kComments = 1000;
+  const auto gate = Make();
+  ExpectAccepted(CheckAt(*gate, token));
+  const std::size_t before = gate->Metrics().cachedBytes;
+  std::string longer = token;
+  for (std::size_t i = 0; i < kComments; ++i) {
+    longer += "<!---->";
+  }
+  ExpectAccepted(CheckAt(*gate, longer));
+  EXPECT_GE(gate->Metrics().cachedBytes, 2 * before + 64 * kComments);
+}
+
 TEST_F(GateHitsTest, Hit) {
   const auto gate = Make();
   ExpectAccepted(CheckAt(*gate, token));

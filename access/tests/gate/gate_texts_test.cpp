@@ -140,5 +140,14 @@ TEST_F(GateTextsTest, LongNames) {
   ExpectAccepted(Check(changed));
 }
 
+TEST_F(GateTextsTest, FirstLineIsTheDecision) {
+  EXPECT_EQ(Check(text).ToString().substr(0, 9), "accepted\n");
+  config.name = "orders";
+  EXPECT_EQ(Check(text).ToString().substr(0, 17), "orders: accepted\n");
+  config.largestToken = 1;
+  EXPECT_EQ(Check("<a>").ToString().substr(0, 79),
+            "orders: refused (too-large): The token is too large: 3 bytes, at most 1.\n  size");
+}
+
 }  // namespace
 }  // namespace SsoClient::Access::Testing

@@ -139,6 +139,23 @@ TEST_F(TrustEntryTest, LatestListCounts) {
   EXPECT_FALSE(First().revokedSince);
 }
 
+// The new key's later lists need not contain what was issued by the old one.
+TEST_F(TrustEntryTest, LatestListOfEachKeyOfTheAuthorityCounts) {
+  config.issuers[0].listSignerPaths.push_back(Put("new-ca.pem", StrangeCa().Pem()));
+  const std::time_t now = std::time(nullptr);
+  const std::string byNewKey = MakeCrl(StrangeCa(), nullptr, 900, -100, now);
+  Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(0), 3600, -200, now));
+  Put("lists/b.crl", byNewKey);
+  Make();
+  EXPECT_TRUE(First().revokedSince);
+  EXPECT_EQ(First().listFrom->GetUtcTime(), (now - 100) * 1'000'000);
+  EXPECT_EQ(First().listUntil->GetUtcTime(), (now + 900) * 1'000'000);
+  Put("lists/c.crl", MakeCrl(TrustCa(), nullptr, 500, -100, now));
+  Wait();
+  EXPECT_FALSE(First().revokedSince);
+  EXPECT_EQ(First().listUntil->GetUtcTime(), (now + 500) * 1'000'000);
+}
+
 TEST_F(TrustEntryTest, ListsOfOneDateAllCount) {
   const std::time_t now = std::time(nullptr);
   for (const bool isRevokedFirst : {true, false}) {

@@ -30,13 +30,13 @@ struct GateCacheConfig {
   /// The number of tokens; 0 for no cache. The cache is divided into up to 16 parts; of a part that
   /// is full, the token that was not presented for the longest is evicted first.
   std::size_t tokens = 10000;
-  /// The memory of all tokens. A token counts a kilobyte and four and a half times the length of
-  /// its text.
+  /// The memory of all tokens. A token counts a kilobyte, three times the length of its text, and
+  /// 72 bytes for each "<" in it.
   std::size_t bytes = std::size_t{64} * 1024 * 1024;
 };
 
 struct GateConfig {
-  /// Names the gate in log lines; may be empty.
+  /// Names the gate in the first line of `Verdict::ToString`; may be empty.
   std::string name{};
   /// Who may sign tokens; must not be null.
   std::shared_ptr<TrustStore> trust{};

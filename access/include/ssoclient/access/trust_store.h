@@ -40,8 +40,10 @@ struct TrustedIssuer {
   /// date, or no token that it signed is accepted: also when a folder contains no list yet. Of
   /// several lists that cover a certificate, the one with the latest thisUpdate counts, and all of
   /// them if they have the same. A certificate on it is revoked even if the date of its revocation
-  /// is in the future, and also after the list is out of date. A certificate in several entries of
-  /// an issuer is checked if one of them has lists, against the lists of all.
+  /// is in the future, and also after the list is out of date. If several certificates have signed
+  /// lists, such as those of an authority's old and new key, it is revoked if the latest list of
+  /// any of them says so. A certificate in several entries of an issuer is checked if one of them
+  /// has lists, against the lists of all.
   std::vector<std::string> revocationListPaths{};
   /// The certificates of the authorities that sign these lists. They are not trusted to sign
   /// tokens. A list that none of them, and none of the certificates above, has signed is an error.
