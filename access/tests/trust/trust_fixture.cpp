@@ -5,6 +5,7 @@
 
 namespace SsoClient::Access::Testing {
 
+#include <tarnik/core/exception.h>
 const Identity& Sts(std::size_t number) {
   static std::deque<Identity> made;
   while (made.size() <= number) {
