@@ -3,9 +3,10 @@
 #include <deque>
 #include <filesystem>
 
+#include <tarnik/core/exception.h>
+
 namespace SsoClient::Access::Testing {
 
-#include <tarnik/core/exception.h>
 const Identity& Sts(std::size_t number) {
   static std::deque<Identity> made;
   while (made.size() <= number) {
