@@ -53,7 +53,8 @@ class CheckedTokens {
     std::size_t bytes;
   };
   using Entries = std::list<Entry>;
-  // The digests cannot be chosen by whoever writes tokens, since only accepted tokens are kept.
+  // Only accepted tokens are kept. Their presenters can choose digests, by adding comments and
+  // white space until one fits, but what is in a full bucket slows only the look-ups there.
   struct KeyHash {
     std::size_t operator()(const Key& key) const noexcept {
       std::size_t hash = 0;
