@@ -53,8 +53,8 @@ class CheckedTokens {
     std::size_t bytes;
   };
   using Entries = std::list<Entry>;
-  // Whoever has an accepted token can change its digest, by white space around it for example, but
-  // a shard has too few entries for collisions to matter.
+  // Only accepted tokens are kept. Their presenters can choose digests, by adding comments and
+  // white space until one fits, but what is in a full bucket slows only the look-ups there.
   struct KeyHash {
     std::size_t operator()(const Key& key) const noexcept {
       std::size_t hash = 0;

@@ -154,6 +154,22 @@ TEST_F(AccessExamplesTest, CheckCallerPrintsEachCheck) {
   EXPECT_EQ(missing.output, "check_caller: cannot read /nonexistent/token.xml\n");
 }
 
+TEST_F(AccessExamplesTest, ProvePossessionSignsAChallenge) {
+  TokenSpec spec = SsoClient::Testing::TenMinutes();
+  spec.audienceRestriction = {"https://orders.example.com"};
+  const auto token = AcquireBound(spec);
+  const std::string command = "prove_possession " + token->Issuer() + " " + folder_.Path() +
+                              "/signing.pem https://orders.example.com " +
+                              folder_.Write("token.xml", token->Xml()) + " ";
+  const CommandResult run = RunExample(command + folder_.Write("key.pem", Holder().privateKeyPem));
+  EXPECT_EQ(run.status, 0);
+  EXPECT_THAT(run.output, StartsWith("orders: accepted\n"));
+  const CommandResult thief =
+      RunExample(command + folder_.Write("other.pem", Stranger().privateKeyPem));
+  EXPECT_EQ(thief.status, 1);
+  EXPECT_THAT(thief.output, StartsWith("orders: refused (wrong-proof): "));
+}
+
 TEST_F(AccessExamplesTest, FakeTokenSourceNeedsNoService) {
   const auto token = Acquire();
   const CommandResult run = RunExample("fake_token_source " + folder_.Write("t.xml", token->Xml()));
