@@ -1,4 +1,5 @@
 // Tokens that a gate remembers.
+#include <algorithm>
 #include <atomic>
 #include <thread>
 #include <vector>
@@ -73,10 +74,11 @@ TEST_F(GateHitsTest, NoCache) {
 }
 
 // As documented at `GateCacheConfig::bytes`.
-TEST_F(GateHitsTest, MemoryIsCountedByTheLengthOfTheText) {
+TEST_F(GateHitsTest, MemoryIsCountedByTheLengthOfTheTextAndItsMarks) {
   const auto gate = Make();
   ExpectAccepted(CheckAt(*gate, token));
-  EXPECT_EQ(gate->Metrics().cachedBytes, 1024 + token.size() * 9 / 2);
+  const auto marks = static_cast<std::size_t>(std::count(token.begin(), token.end(), '<'));
+  EXPECT_EQ(gate->Metrics().cachedBytes, 1024 + 3 * token.size() + 72 * marks);
 }
 
 TEST_F(GateHitsTest, OneByteDiffers) {

@@ -93,9 +93,9 @@ TEST_F(GateTextsTest, NamesEachPart) {
                                                 After(start, std::chrono::minutes(-1)).ToString() +
                                                 " to " + After(start, hours(1)).ToString() +
                                                 ", now " + start.ToString() + ", tolerance 300 s");
-  EXPECT_EQ(
-      compared(CheckKind::kSignerKnown),
-      "issuer 'https://sts.example.com/STS'; of 1 that may sign for it, the token names " + signer);
+  EXPECT_EQ(compared(CheckKind::kSignerKnown),
+            "issuer 'https://sts.example.com/STS'; of 1 that may sign for it, the token may mean " +
+                signer);
   EXPECT_EQ(compared(CheckKind::kSignerRevoked), signer + ": revocation is not checked");
   EXPECT_EQ(compared(CheckKind::kAudience),
             "restricted to 'https://a.example', which this service is");
