@@ -24,6 +24,7 @@ namespace {
 using SsoClient::Testing::Holder;
 using SsoClient::Testing::kPassword;
 using SsoClient::Testing::kUser;
+using SsoClient::Testing::Stranger;
 using Tarnik::Testing::CommandResult;
 using testing::HasSubstr;
 using testing::MatchesRegex;
