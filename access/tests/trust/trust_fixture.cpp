@@ -3,8 +3,6 @@
 #include <deque>
 #include <filesystem>
 
-#include <tarnik/core/exception.h>
-
 namespace SsoClient::Access::Testing {
 
 const Identity& Sts(std::size_t number) {
@@ -38,9 +36,6 @@ Names SignersOf(const TrustSnapshot& trust, const std::string& issuer) {
 }
 
 DescriptorShortage::DescriptorShortage() {
-  const auto fail = [] { throw Tarnik::ResourceException("a shortage"); };
-  EXPECT_EQ(MessageOf<Tarnik::ResourceException>(fail), "a shortage");
-  EXPECT_EQ(MessageOf<Tarnik::Exception>(fail), "a shortage");
   getrlimit(RLIMIT_NOFILE, &before_);
   rlimit none = before_;
   none.rlim_cur = 0;

@@ -52,12 +52,20 @@ std::string MessageOf(const Action& action) {
   return "nothing";
 }
 
-/// During its lifetime this process can open no descriptor. UndefinedBehaviorSanitizer needs one to
-/// look at the first object of a type, so it is shown the exception of a shortage before.
+/// During its lifetime this process can open no descriptor.
 class DescriptorShortage {
  public:
+  /// UndefinedBehaviorSanitizer needs descriptors to check the types of exceptions.
+#ifdef __SANITIZE_ADDRESS__
+  static constexpr bool kIsPossible = false;
+#else
+  static constexpr bool kIsPossible = true;
+#endif
+
   DescriptorShortage();
-  ~DescriptorShortage() { setrlimit(RLIMIT_NOFILE, &before_); }
+  ~DescriptorShortage() {
+    setrlimit(RLIMIT_NOFILE, &before_);
+  }
   DescriptorShortage(const DescriptorShortage&) = delete;
   DescriptorShortage& operator=(const DescriptorShortage&) = delete;
 

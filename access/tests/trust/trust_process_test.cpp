@@ -121,6 +121,9 @@ TEST_F(TrustProcessTest, ChildMayDestroyTheStore) {
 }
 
 TEST_F(TrustProcessTest, ProcessThatWatchesEnds) {
+#ifdef __SANITIZE_ADDRESS__
+  GTEST_SKIP() << "at its exit, a child reports what threads of its parent hold as leaks";
+#endif
   AwaitIdleThreads();
   const pid_t child = Tarnik::Testing::ForkWithLimit();
   if (child == 0) {
