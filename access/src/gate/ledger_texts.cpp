@@ -96,11 +96,11 @@ const char* SentenceOf(Reason reason) noexcept {
     case Reason::kUnrestricted:
       return "The token is not restricted to audiences";
     case Reason::kBearerRefused:
-      return "Bearer tokens are refused";
+      return "The token is a bearer token, which this service refuses";
     case Reason::kNoProof:
-      return "The presenter has not proved possession of the token's key";
+      return "The presenter has given no proof of possession of the token's key";
     case Reason::kWrongProof:
-      return "The presenter's proof is not one of possession of the token's key";
+      return "The presenter has not proved possession of the token's key";
     case Reason::kTooLongLived:
       return "The token is valid for too long";
     case Reason::kTooDeeplyDelegated:
@@ -108,11 +108,30 @@ const char* SentenceOf(Reason reason) noexcept {
     case Reason::kNotInGroup:
       return "The token's subject is in none of the allowed groups";
     case Reason::kRefusedByPredicate:
-      return "The service refuses the token";
+      return "The service's own rule refuses the token";
     case Reason::kPredicateFailed:
-      return "The service's check of the token has failed";
+      return "The service's own rule threw an exception";
   }
   return "The token is refused";
+}
+
+// What follows the sentence: the ledger's text, unless it says the same again.
+std::string EndOfMessage(const VerdictFacts& facts) {
+  switch (facts.reason) {
+    case Reason::kUnknownIssuer:
+      return ": " + ShownText(facts.checked->token->Issuer());
+    case Reason::kWrongAudience:
+      return ": " + OtherAudiencesText(facts);
+    case Reason::kUnrestricted:
+      return "; " + OwnAudiencesText(facts);
+    case Reason::kPredicateFailed:
+      return facts.detail.empty() ? std::string() : ": " + facts.detail;
+    case Reason::kBearerRefused:
+    case Reason::kRefusedByPredicate:
+      return {};
+    default:
+      return ": " + WholeText(facts, facts.failed);
+  }
 }
 
 }  // namespace
@@ -128,7 +147,9 @@ std::string MessageText(const VerdictFacts& facts) {
   if (facts.reason == Reason::kRefusedByPredicate && !facts.detail.empty()) {
     return ToRecordText(facts.detail);
   }
-  return ToRecordText(SentenceOf(facts.reason) + (": " + WholeText(facts, facts.failed)) + ".");
+  const std::string text = SentenceOf(facts.reason) + EndOfMessage(facts);
+  // Messages of the platform are sentences themselves.
+  return ToRecordText(text.back() == '.' ? text : text + ".");
 }
 
 }  // namespace SsoClient::Access

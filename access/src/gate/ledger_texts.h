@@ -23,6 +23,8 @@ std::string SignatureText(const VerdictFacts& facts);
 
 /// The parts that are about the policy of the gate.
 std::string AudienceText(const VerdictFacts& facts);
+std::string OwnAudiencesText(const VerdictFacts& facts);
+std::string OtherAudiencesText(const VerdictFacts& facts);
 std::string ConfirmationText(const VerdictFacts& facts);
 std::string PossessionText(const VerdictFacts& facts);
 std::string LifetimeText(const VerdictFacts& facts);

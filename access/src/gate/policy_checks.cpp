@@ -44,14 +44,29 @@ Reason CheckConfirmation(const Presentation& presented) {
   return isWelcome ? Reason::kNone : Reason::kBearerRefused;
 }
 
-bool Proves(const Presenter& presenter, const Tarnik::Crypto::Certificate& holder) {
+bool ProvesBySignature(const Presenter& presenter, const Tarnik::Crypto::Certificate& holder,
+                       std::string& detail) {
+  // Nobody has chosen empty data for this exchange.
+  if (presenter.Data().empty()) {
+    detail = "the data is empty";
+    return false;
+  }
+  const bool isVerified = Tarnik::Crypto::VerifyData(holder, presenter.Algorithm(),
+                                                     presenter.Data(), presenter.Signature());
+  if (!isVerified) {
+    detail = presenter.Signature().empty() ? "the signature is empty"
+                                           : "it does not verify with that key";
+  }
+  return isVerified;
+}
+
+bool Proves(const Presenter& presenter, const Tarnik::Crypto::Certificate& holder,
+            std::string& detail) {
   if (presenter.GetKind() == Presenter::Kind::kTlsCertificate) {
     return Tarnik::Crypto::IsSameCertificate(*presenter.Certificate(), holder);
   }
-  // Nobody has chosen empty data for this exchange.
-  return presenter.GetKind() == Presenter::Kind::kSignature && !presenter.Data().empty() &&
-         Tarnik::Crypto::VerifyData(holder, presenter.Algorithm(), presenter.Data(),
-                                    presenter.Signature());
+  return presenter.GetKind() == Presenter::Kind::kSignature &&
+         ProvesBySignature(presenter, holder, detail);
 }
 
 Reason CheckPossession(const Presentation& presented) {
@@ -63,8 +78,9 @@ Reason CheckPossession(const Presentation& presented) {
   }
   try {
     const auto holder = presented.token.HolderOfKeyCertificate();
-    return holder != nullptr && Proves(presented.presenter, *holder) ? Reason::kNone
-                                                                     : Reason::kWrongProof;
+    const bool isProved =
+        holder != nullptr && Proves(presented.presenter, *holder, presented.detail);
+    return isProved ? Reason::kNone : Reason::kWrongProof;
   } catch (const Tarnik::Exception& e) {
     presented.detail = Tarnik::ToDisplayText(e.Message(), kMaxProofFailure);
     return Reason::kWrongProof;
@@ -111,7 +127,7 @@ Reason CheckPredicate(const Presentation& presented) {
   } catch (const abi::__forced_unwind&) {
     throw;  // the thread is being cancelled
   } catch (...) {
-    presented.detail = "an exception that is not a std::exception";
+    presented.detail = "one that is not a std::exception";
   }
   return Reason::kPredicateFailed;
 }

@@ -52,6 +52,10 @@ std::string ProofText(const PresenterFacts& presenter) {
   return {};
 }
 
+std::string VerifiedText(const PresenterFacts& presenter) {
+  return presenter.kind == Presenter::Kind::kSignature ? ", which verifies with that key" : "";
+}
+
 std::string Ending(const VerdictFacts& facts) {
   return facts.detail.empty() ? std::string() : ": " + facts.detail;
 }
@@ -59,17 +63,24 @@ std::string Ending(const VerdictFacts& facts) {
 }  // namespace
 
 std::string AudienceText(const VerdictFacts& facts) {
-  std::set<std::string> audiences;
-  facts.checked->token->GetAudiences(audiences);
-  const std::string own = "this service is " + ShownList(facts.Config()->audiences, ShownText);
-  if (audiences.empty()) {
-    return "not restricted; " + own;
+  if (!facts.checked->traits.isRestricted) {
+    return "not restricted; " + OwnAudiencesText(facts);
   }
   if (facts.checked->traits.audience != nullptr) {
     return "restricted to " + ShownText(*facts.checked->traits.audience) +
            ", which this service is";
   }
-  return "restricted to " + ShownList(audiences, ShownText) + "; " + own;
+  return "restricted to " + OtherAudiencesText(facts);
+}
+
+std::string OwnAudiencesText(const VerdictFacts& facts) {
+  return "this service is " + ShownList(facts.Config()->audiences, ShownText);
+}
+
+std::string OtherAudiencesText(const VerdictFacts& facts) {
+  std::set<std::string> audiences;
+  facts.checked->token->GetAudiences(audiences);
+  return ShownList(audiences, ShownText) + "; " + OwnAudiencesText(facts);
 }
 
 std::string ConfirmationText(const VerdictFacts& facts) {
@@ -90,8 +101,9 @@ std::string PossessionText(const VerdictFacts& facts) {
   if (token.ConfirmationType() == BEARER) {
     return "a bearer token has no key";
   }
+  const bool hasFailed = facts.reason != Reason::kNone && facts.failed == CheckKind::kPossession;
   return "the token's key is that of " + HolderText(token) + "; " + ProofText(facts.presenter) +
-         (facts.failed == CheckKind::kPossession ? Ending(facts) : std::string());
+         (hasFailed ? Ending(facts) : VerifiedText(facts.presenter));
 }
 
 std::string LifetimeText(const VerdictFacts& facts) {
@@ -128,13 +140,13 @@ std::string GroupsText(const VerdictFacts& facts) {
 
 std::string PredicateText(const VerdictFacts& facts) {
   if (!facts.Config()->predicate) {
-    return "none";
+    return "no predicate";
   }
   switch (facts.reason) {
     case Reason::kRefusedByPredicate:
-      return "refused" + Ending(facts);
+      return facts.detail.empty() ? "refused without a reason" : "refused" + Ending(facts);
     case Reason::kPredicateFailed:
-      return "has thrown" + Ending(facts);
+      return "threw an exception" + Ending(facts);
     default:
       return "accepted";
   }

@@ -105,15 +105,15 @@ TEST_F(GateTextsTest, NamesEachPart) {
   EXPECT_EQ(compared(CheckKind::kLifetime), "3660 s, at most 2678400 s");
   EXPECT_EQ(compared(CheckKind::kDelegation), "0 delegates, at most 10");
   EXPECT_EQ(compared(CheckKind::kGroups), "no group is required");
-  EXPECT_EQ(compared(CheckKind::kPredicate), "none");
+  EXPECT_EQ(compared(CheckKind::kPredicate), "no predicate");
 }
 
 TEST_F(GateTextsTest, RefusalSaysBothSides) {
   config.audiences = {"https://c.example", "https://d.example", "https://e.example",
                       "https://f.example", "https://g.example"};
   EXPECT_EQ(Check(text).Message(),
-            "The token is restricted to other audiences: restricted to 'https://a.example', "
-            "'https://b.example'; this service is 'https://c.example', 'https://d.example', "
+            "The token is restricted to other audiences: 'https://a.example', 'https://b.example'; "
+            "this service is 'https://c.example', 'https://d.example', "
             "'https://e.example', 'https://f.example' and 1 more.");
 }
 
