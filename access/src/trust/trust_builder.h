@@ -4,6 +4,7 @@
 #include <memory>
 #include <set>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <ssoclient/access/trust_store.h>
@@ -19,8 +20,8 @@ struct Trust {
   TrustSnapshot snapshot;
   /// The signers of each issuer of the configuration, in its order.
   std::vector<TrustedSigner> signers;
-  /// Of the different certificates among them (SHA-256).
-  std::set<Tarnik::Crypto::Sha256Digest> fingerprints;
+  /// The issuer and the fingerprint of each of them.
+  std::set<std::pair<std::string, Tarnik::Crypto::Sha256Digest>> identities;
   std::string digest;  ///< `TrustContents::digest`
 };
 

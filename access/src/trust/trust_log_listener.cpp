@@ -1,4 +1,6 @@
+#include <cstddef>
 #include <memory>
+#include <string>
 
 #include <ssoclient/access/trust_store.h>
 #include <tarnik/service/log.h>
@@ -17,18 +19,23 @@ const Tarnik::Service::StaticLogger& TrustLogger() {
   return logger;
 }
 
+std::string Signers(std::size_t number) {
+  return std::to_string(number) + (number == 1 ? " signer" : " signers");
+}
+
 class TrustLogListener final : public TrustListener {
  public:
   void OnTrustReplaced(const TrustRecord& record) override {
     LogInternal(TrustLogger(), kReplacedLevel,
-                "Store '%1': the trust is that of the files: %2 certificates, %3 added, %4 removed",
-                {record.store, record.signers, record.added, record.removed});
+                "Store '%1': the trust is that of the files: %2, %3 added, %4 removed, %5 revoked, "
+                "%6 without a revocation list",
+                {record.store, Signers(record.signers), record.added, record.removed,
+                 record.revoked, record.uncovered});
   }
 
   void OnTrustKept(const TrustRecord& record) override {
-    LogInternal(TrustLogger(), kKeptLevel,
-                "Store '%1': the trust stays as it was, %2 certificates: %3",
-                {record.store, record.signers, record.failure});
+    LogInternal(TrustLogger(), kKeptLevel, "Store '%1': the trust stays as it was, %2: %3",
+                {record.store, Signers(record.signers), record.failure});
   }
 };
 

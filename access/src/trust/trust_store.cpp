@@ -91,7 +91,7 @@ std::shared_ptr<TrustStoreImpl> CreateTrustStore(TrustStoreConfig config,
   MakePathsAbsolute(config);
   TrustListing listing;
   auto trust = BuildTrust(config.issuers, ReadUnchanged(config.issuers, listing));
-  if (trust->fingerprints.empty()) {
+  if (trust->signers.empty()) {
     throw Tarnik::InvalidArgumentException("The trust store has no certificate.");
   }
   auto state = MakeTrustState(std::move(trust), runtime->Now().wall);

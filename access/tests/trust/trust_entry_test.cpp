@@ -107,6 +107,32 @@ TEST_F(TrustEntryTest, ListThatIsAddedCounts) {
   ASSERT_EQ(listener->replaced.size(), 1U);
   EXPECT_EQ(listener->replaced[0].added, 0U);
   EXPECT_EQ(listener->replaced[0].removed, 0U);
+  EXPECT_EQ(listener->replaced[0].revoked, 1U);
+  EXPECT_EQ(listener->replaced[0].uncovered, 0U);
+}
+
+TEST_F(TrustEntryTest, RecordsCountWhoIsRevokedAndWhoHasNoList) {
+  Put("trust/b.pem", Sts(1).Pem());
+  Put("lists/a.crl", MakeCrl(TrustCa(), nullptr, -10, -100));
+  Make();
+  Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(1)));
+  store->Reload();
+  Put("trust/c.pem", Tarnik::Testing::MakeIdentity({}, nullptr).Pem());
+  store->Reload();
+  Remove("lists/a.crl");
+  store->Reload();
+  Put("lists/a.crl", "broken");
+  EXPECT_THROW(store->Reload(), CryptoException);
+  ASSERT_EQ(listener->replaced.size(), 3U);
+  EXPECT_EQ(listener->replaced[0].revoked, 1U);
+  EXPECT_EQ(listener->replaced[0].uncovered, 0U);
+  EXPECT_EQ(listener->replaced[1].revoked, 1U);
+  EXPECT_EQ(listener->replaced[1].uncovered, 1U);
+  EXPECT_EQ(listener->replaced[2].revoked, 0U);
+  EXPECT_EQ(listener->replaced[2].uncovered, 3U);
+  ASSERT_EQ(listener->kept.size(), 1U);
+  EXPECT_EQ(listener->kept[0].signers, 3U);
+  EXPECT_EQ(listener->kept[0].uncovered, 3U);
 }
 
 TEST_F(TrustEntryTest, ListThatIsRemovedNoLongerCovers) {

@@ -74,13 +74,18 @@ struct TrustDescription {
   SSOCLIENT_ACCESS_EXPORT std::string ToString() const;
 };
 
-/// Changed files have been read, or could not be.
+/// Changed files have been read, or could not be. The numbers are those of
+/// `TrustDescription::signers`: a certificate that is trusted for two issuers counts twice.
 struct TrustRecord {
   std::string store{};      ///< `TrustStoreConfig::name`
   std::string failure{};    ///< why the trust stays as it was; empty if it has been replaced
-  std::size_t added = 0;    ///< certificates, by their SHA-256
-  std::size_t removed = 0;  ///< certificates, by their SHA-256
-  std::size_t signers = 0;  ///< certificates in use now
+  std::size_t added = 0;    ///< signers that were not trusted before, by issuer and SHA-256
+  std::size_t removed = 0;  ///< signers that are no longer trusted, by issuer and SHA-256
+  std::size_t signers = 0;  ///< signers in use now, with those that are revoked or uncovered
+  std::size_t revoked = 0;  ///< of them, those that are revoked
+  /// Of them, those that must be covered by a revocation list, but that no list covers. A list that
+  /// is out of date still covers.
+  std::size_t uncovered = 0;
 };
 
 /// Sees what a trust store does. The functions run on a worker thread of the platform, or on the
