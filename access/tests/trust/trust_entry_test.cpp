@@ -33,7 +33,7 @@ class TrustEntryTest : public TrustFixture {
 
   static constexpr const char* kForeignList =
       "The trust file '/lists/a.crl' cannot be used: No certificate of the entry has signed the "
-      "revocation list.";
+      "revocation list of 'CN=Authority'.";
 
   std::shared_ptr<const TrustSnapshot> snapshot;
 };
@@ -209,10 +209,19 @@ TEST_F(TrustEntryTest, ListOfAStrangerWithTheSameNameIsAnError) {
 TEST_F(TrustEntryTest, ListOfAnotherIssuerIsAnErrorUnlessItsSignerIsGiven) {
   const Identity other = Tarnik::Testing::MakeCa("Other");
   Put("lists/a.crl", MakeCrl(other, nullptr));
-  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] { Make(); })), kForeignList);
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] { Make(); })),
+            "The trust file '/lists/a.crl' cannot be used: No certificate of the entry has signed "
+            "the revocation list of 'CN=Other'.");
   config.issuers[0].listSignerPaths.push_back(Put("other.pem", other.Pem()));
   Make();
   EXPECT_FALSE(First().listUntil);
+}
+
+TEST_F(TrustEntryTest, ListWithoutAnyListSignerIsAnErrorThatSaysSo) {
+  config.issuers[0].listSignerPaths.clear();
+  Put("lists/a.crl", MakeCrl(TrustCa(), nullptr));
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] { Make(); })),
+            std::string(kForeignList) + " The entry has no list signers.");
 }
 
 TEST_F(TrustEntryTest, TrustedCertificateMaySignItsOwnList) {
