@@ -198,6 +198,7 @@ std::shared_ptr<const Trust> BuildTrust(const std::vector<TrustedIssuer>& issuer
     entries.push_back(DecodeEntry(issuers[i], contents.entries[i]));
   }
   std::vector<TrustedSigner> signers;
+  std::vector<std::string> withoutSigners;
   std::map<std::string, IssuerTrust, std::less<>> named;
   IssuerTrust others;
   std::set<std::string_view> done;
@@ -205,13 +206,17 @@ std::shared_ptr<const Trust> BuildTrust(const std::vector<TrustedIssuer>& issuer
     if (done.insert(entry.issuer).second) {
       BuiltIssuer built = BuildIssuer(entries, entry.issuer);
       Describe(entry.issuer, built, signers);
+      if (built.ownPaths.empty()) {
+        withoutSigners.push_back(entry.issuer);
+      }
       (entry.issuer.empty() ? others : named[entry.issuer]) = std::move(built.trust);
     }
   }
   TrustSnapshot snapshot(std::move(named), std::move(others), NextVersion());
   auto identities = IdentitiesOf(signers);
-  return std::make_shared<const Trust>(
-      Trust{std::move(snapshot), std::move(signers), std::move(identities), contents.digest});
+  return std::make_shared<const Trust>(Trust{std::move(snapshot), std::move(signers),
+                                             std::move(withoutSigners), std::move(identities),
+                                             contents.digest});
 }
 
 }  // namespace SsoClient::Access

@@ -18,8 +18,9 @@ namespace SsoClient::Access {
 /// The trust of some contents of files. Immutable.
 struct Trust {
   TrustSnapshot snapshot;
-  /// The signers of each issuer of the configuration, in its order.
+  /// Of each issuer of the configuration, in its order.
   std::vector<TrustedSigner> signers;
+  std::vector<std::string> issuersWithoutSigners;  ///< as in `TrustDescription`
   /// The issuer and the fingerprint of each of them.
   std::set<std::pair<std::string, Tarnik::Crypto::Sha256Digest>> identities;
   std::string digest;  ///< `TrustContents::digest`

@@ -41,7 +41,8 @@ class WatchedTrustStore final : public TrustStoreImpl {
   TrustDescription Describe() const override {
     Follow();
     const auto state = parts_->cell.Get();
-    return {state->trust->signers, state->loadedAt, state->failure};
+    const Trust& trust = *state->trust;
+    return {trust.signers, trust.issuersWithoutSigners, state->loadedAt, state->failure};
   }
 
   std::shared_ptr<const TrustSnapshot> Current() const override {

@@ -21,6 +21,7 @@ std::size_t CountMissing(const Trust& trust, const Trust& other) {
 TrustRecord RecordOf(const TrustStoreConfig& config, const Trust& trust) {
   TrustRecord record;
   record.store = config.name;
+  record.issuersWithoutSigners = trust.issuersWithoutSigners;
   record.signers = trust.signers.size();
   for (const TrustedSigner& signer : trust.signers) {
     record.revoked += signer.revokedSince ? 1 : 0;

@@ -58,6 +58,16 @@ TEST_F(TrustLogListenerTest, OneSignerIsSingular) {
                                       "2 Store '': the trust stays as it was, 1 signer: "}));
 }
 
+TEST_F(TrustLogListenerTest, IssuersWithoutSignersAreNamed) {
+  TrustRecord record;
+  record.issuersWithoutSigners = {"https://b\n", ""};
+  CreateTrustLogListener()->OnTrustReplaced(record);
+  EXPECT_EQ(lines, std::vector<std::string>{
+                       "4 Store '': the trust is that of the files: 0 signers, 0 added, 0 removed, "
+                       "0 revoked, 0 without a revocation list; without signers: 'https://b?', any "
+                       "issuer"});
+}
+
 TEST_F(TrustLogListenerTest, ListenerDoesNothingByDefault) {
   TrustListener none;
   none.OnTrustReplaced({});

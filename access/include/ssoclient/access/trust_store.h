@@ -65,6 +65,10 @@ struct TrustedSigner {
 /// The trust in use, and the last attempt to read it.
 struct TrustDescription {
   std::vector<TrustedSigner> signers{};
+  /// `TrustedIssuer::issuer` of the entries of which no signer is above, since their folders
+  /// contain no certificate; empty for any issuer. Their tokens are refused, unless there are
+  /// signers of any issuer.
+  std::vector<std::string> issuersWithoutSigners{};
   Tarnik::System::DateTime loadedAt{};  ///< when the files were last read successfully
   /// Why the files as they are now were not accepted; empty if the trust in use is that of the
   /// files, as far as they have been looked at.
@@ -77,8 +81,9 @@ struct TrustDescription {
 /// Changed files have been read, or could not be. The numbers are those of
 /// `TrustDescription::signers`: a certificate that is trusted for two issuers counts twice.
 struct TrustRecord {
-  std::string store{};      ///< `TrustStoreConfig::name`
-  std::string failure{};    ///< why the trust stays as it was; empty if it has been replaced
+  std::string store{};    ///< `TrustStoreConfig::name`
+  std::string failure{};  ///< why the trust stays as it was; empty if it has been replaced
+  std::vector<std::string> issuersWithoutSigners{};  ///< as in `TrustDescription`
   std::size_t added = 0;    ///< signers that were not trusted before, by issuer and SHA-256
   std::size_t removed = 0;  ///< signers that are no longer trusted, by issuer and SHA-256
   std::size_t signers = 0;  ///< signers in use now, with those that are revoked or uncovered
