@@ -93,7 +93,7 @@ std::shared_ptr<TrustStoreImpl> CreateTrustStore(TrustStoreConfig config,
   TrustListing listing;
   auto trust = BuildTrust(config.issuers, ReadUnchanged(config.issuers, listing));
   if (trust->signers.empty()) {
-    throw Tarnik::InvalidArgumentException("The trust store has no certificate.");
+    ThrowNoCertificate(config);
   }
   auto state = MakeTrustState(std::move(trust), runtime->Now().wall);
   return std::make_shared<WatchedTrustStore>(

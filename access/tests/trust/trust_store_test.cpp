@@ -40,7 +40,9 @@ TEST_F(TrustStoreTest, CertificatesAndFilesAreTrustedTogether) {
 
 TEST_F(TrustStoreTest, StoreWithoutCertificatesIsRefused) {
   Remove("trust/a.pem");
-  EXPECT_EQ(Refusal<InvalidArgumentException>(), "The trust store has no certificate.");
+  EXPECT_EQ(Refusal<InvalidArgumentException>(),
+            "The trust store has no certificate. Its entries contain none in '/trust' (issuers[0], "
+            "'https://sts.example').");
   Put("trust/a.pem", Sts(0).Pem());
   Make();
   EXPECT_EQ(Signers(), Names{"CN=sts-0"});
@@ -48,7 +50,7 @@ TEST_F(TrustStoreTest, StoreWithoutCertificatesIsRefused) {
 
 TEST_F(TrustStoreTest, BrokenConfigurationIsRefusedBeforeFilesAreRead) {
   config.issuers.clear();
-  EXPECT_EQ(Refusal<InvalidArgumentException>(), "The trust store has no issuer.");
+  EXPECT_EQ(Refusal<InvalidArgumentException>(), "The trust store has no entry.");
 }
 
 TEST_F(TrustStoreTest, PathThatDoesNotExistIsNamed) {

@@ -116,7 +116,7 @@ SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustListener> CreateTrustLogListener();
 struct TrustStoreConfig {
   /// Names the store in records and log lines; may be empty.
   std::string name{};
-  /// At least one, each with a certificate or the path of one.
+  /// The entries: at least one, each with a certificate or the path of one.
   std::vector<TrustedIssuer> issuers{};
   /// Whether the store looks for changes of the files by itself. It does so four times a second, by
   /// their metadata, and reads changed files when they have stayed the same for a quarter of a
@@ -149,14 +149,14 @@ class SSOCLIENT_ACCESS_EXPORT TrustStore {
   virtual TrustDescription Describe() const = 0;
 };
 
-/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no entry for an issuer,
-/// an entry names no issuer without `isForAnyIssuer`, or one with it, an entry has neither a
-/// certificate nor a path of one, a certificate is null, there is no certificate at all, since a
-/// gate would refuse every token, there are signers of lists but no path of a list, and when a path
-/// is empty or contains a NUL; `Tarnik::IOException` when a path does not exist or cannot be read,
-/// or the files change during each of several readings; `Tarnik::Crypto::CryptoException` when a
-/// file contains no certificate or list, or one that cannot be used; `Tarnik::ResourceException`
-/// when the system has too few descriptors. A message about a file names it.
+/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no entry, an entry
+/// names no issuer without `isForAnyIssuer`, or one with it, an entry has neither a certificate nor
+/// a path of one, a certificate is null, there is no certificate at all, since a gate would refuse
+/// every token, there are signers of lists but no path of a list, and when a path is empty or
+/// contains a NUL; `Tarnik::IOException` when a path does not exist or cannot be read, or the files
+/// change during each of several readings; `Tarnik::Crypto::CryptoException` when a file contains
+/// no certificate or list, or one that cannot be used; `Tarnik::ResourceException` when the system
+/// has too few descriptors. A message names the file or the entry, by its index in `issuers`.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustStore> CreateTrustStore(TrustStoreConfig config);
 
 }  // namespace SsoClient::Access
