@@ -103,14 +103,11 @@ struct BuiltIssuer {
 
 class IssuerBuilder {
  public:
-  explicit IssuerBuilder(std::set<Sha256Digest>& fingerprints) : fingerprints_(fingerprints) {}
-
   void Add(const TrustEntry& entry, bool isOwn) {
     for (const TrustEntry::Found& found : entry.certificates) {
       const auto digest = Tarnik::Crypto::Fingerprint(*found.certificate);
       const auto [place, isNew] = places_.try_emplace(digest, built_.trust.signers.size());
       if (isNew) {
-        fingerprints_.insert(digest);
         states_.emplace_back();
         built_.trust.signers.push_back(MakeSigner(found.certificate));
         if (isOwn) {
@@ -143,15 +140,13 @@ class IssuerBuilder {
   }
 
  private:
-  std::set<Sha256Digest>& fingerprints_;
   BuiltIssuer built_;
   std::map<Sha256Digest, std::size_t> places_;
   std::vector<ListedStates> states_;  // of the signers
 };
 
-BuiltIssuer BuildIssuer(const std::vector<TrustEntry>& entries, std::string_view issuer,
-                        std::set<Sha256Digest>& fingerprints) {
-  IssuerBuilder builder(fingerprints);
+BuiltIssuer BuildIssuer(const std::vector<TrustEntry>& entries, std::string_view issuer) {
+  IssuerBuilder builder;
   for (const TrustEntry& entry : entries) {
     if (entry.issuer == issuer) {
       builder.Add(entry, true);
@@ -184,6 +179,15 @@ void Describe(const std::string& issuer, const BuiltIssuer& built,
   }
 }
 
+std::set<std::pair<std::string, Sha256Digest>> IdentitiesOf(
+    const std::vector<TrustedSigner>& signers) {
+  std::set<std::pair<std::string, Sha256Digest>> identities;
+  for (const TrustedSigner& signer : signers) {
+    identities.emplace(signer.issuer, Tarnik::Crypto::Fingerprint(*signer.certificate));
+  }
+  return identities;
+}
+
 }  // namespace
 
 std::shared_ptr<const Trust> BuildTrust(const std::vector<TrustedIssuer>& issuers,
@@ -193,21 +197,26 @@ std::shared_ptr<const Trust> BuildTrust(const std::vector<TrustedIssuer>& issuer
   for (std::size_t i = 0; i < issuers.size(); ++i) {
     entries.push_back(DecodeEntry(issuers[i], contents.entries[i]));
   }
-  std::set<Sha256Digest> fingerprints;
   std::vector<TrustedSigner> signers;
+  std::vector<std::string> withoutSigners;
   std::map<std::string, IssuerTrust, std::less<>> named;
   IssuerTrust others;
   std::set<std::string_view> done;
   for (const TrustEntry& entry : entries) {
     if (done.insert(entry.issuer).second) {
-      BuiltIssuer built = BuildIssuer(entries, entry.issuer, fingerprints);
+      BuiltIssuer built = BuildIssuer(entries, entry.issuer);
       Describe(entry.issuer, built, signers);
+      if (built.ownPaths.empty()) {
+        withoutSigners.push_back(entry.issuer);
+      }
       (entry.issuer.empty() ? others : named[entry.issuer]) = std::move(built.trust);
     }
   }
   TrustSnapshot snapshot(std::move(named), std::move(others), NextVersion());
-  return std::make_shared<const Trust>(
-      Trust{std::move(snapshot), std::move(signers), std::move(fingerprints), contents.digest});
+  auto identities = IdentitiesOf(signers);
+  return std::make_shared<const Trust>(Trust{std::move(snapshot), std::move(signers),
+                                             std::move(withoutSigners), std::move(identities),
+                                             contents.digest});
 }
 
 }  // namespace SsoClient::Access

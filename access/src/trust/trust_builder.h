@@ -4,6 +4,7 @@
 #include <memory>
 #include <set>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <ssoclient/access/trust_store.h>
@@ -17,10 +18,11 @@ namespace SsoClient::Access {
 /// The trust of some contents of files. Immutable.
 struct Trust {
   TrustSnapshot snapshot;
-  /// The signers of each issuer of the configuration, in its order.
+  /// Of each issuer of the configuration, in its order.
   std::vector<TrustedSigner> signers;
-  /// Of the different certificates among them (SHA-256).
-  std::set<Tarnik::Crypto::Sha256Digest> fingerprints;
+  std::vector<std::string> issuersWithoutSigners;  ///< as in `TrustDescription`
+  /// The issuer and the fingerprint of each of them.
+  std::set<std::pair<std::string, Tarnik::Crypto::Sha256Digest>> identities;
   std::string digest;  ///< `TrustContents::digest`
 };
 

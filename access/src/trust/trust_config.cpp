@@ -1,50 +1,68 @@
 #include "trust/trust_config.h"
 
 #include <algorithm>
+#include <cstddef>
 #include <filesystem>
 #include <string>
 #include <system_error>
 #include <vector>
 
 #include <tarnik/core/exception.h>
+#include <tarnik/text/display_text.h>
+
+#include "trust/trust_text.h"
 
 namespace SsoClient::Access {
 
 namespace {
 
-void RequireTrust(bool condition, const char* message) {
+constexpr std::size_t kLongestPath = 200;
+
+void RequireTrust(bool condition, const std::string& message) {
   if (!condition) {
     throw Tarnik::InvalidArgumentException(message);
   }
 }
 
-void CheckPaths(const std::vector<std::string>& paths) {
-  for (const std::string& path : paths) {
-    RequireTrust(!path.empty(), "A path of the trust store is empty.");
-    RequireTrust(path.find('\0') == std::string::npos, "A path of the trust store contains a NUL.");
+// "entry issuers[1] ('https://b') of the trust store"
+std::string EntryText(const TrustedIssuer& entry, std::size_t index) {
+  const bool isNameless = entry.issuer.empty() && !entry.isForAnyIssuer;
+  return "entry issuers[" + std::to_string(index) + "]" +
+         (isNameless ? "" : " (" + IssuerText(entry.issuer) + ")") + " of the trust store";
+}
+
+void CheckPaths(const std::vector<std::string>& paths, const char* member,
+                const std::string& entry) {
+  for (std::size_t i = 0; i < paths.size(); ++i) {
+    const std::string name = std::string(member) + "[" + std::to_string(i) + "] of the " + entry;
+    RequireTrust(!paths[i].empty(), "The path " + name + " is empty.");
+    RequireTrust(paths[i].find('\0') == std::string::npos,
+                 "The path " + name + " contains a NUL: '" +
+                     Tarnik::ToDisplayText(paths[i], kLongestPath) + "'.");
   }
 }
 
 // An entry without an issuer is for any: that has to be said, since it may have been forgotten.
-void CheckName(const TrustedIssuer& issuer) {
-  RequireTrust(issuer.isForAnyIssuer || !issuer.issuer.empty(),
-               "An entry of the trust store names no issuer and is not for any issuer.");
-  RequireTrust(!issuer.isForAnyIssuer || issuer.issuer.empty(),
-               "An entry of the trust store names an issuer and is for any issuer.");
+void CheckName(const TrustedIssuer& entry, const std::string& name) {
+  RequireTrust(entry.isForAnyIssuer || !entry.issuer.empty(),
+               "The " + name + " names no issuer and is not for any issuer.");
+  RequireTrust(!entry.isForAnyIssuer || entry.issuer.empty(),
+               "The " + name + " names an issuer and is for any issuer.");
 }
 
-void CheckIssuer(const TrustedIssuer& issuer) {
-  CheckName(issuer);
-  RequireTrust(!issuer.certificates.empty() || !issuer.certificatePaths.empty(),
-               "An issuer of the trust store has neither a certificate nor a path of one.");
-  RequireTrust(std::find(issuer.certificates.begin(), issuer.certificates.end(), nullptr) ==
-                   issuer.certificates.end(),
-               "A certificate of the trust store is null.");
-  RequireTrust(issuer.listSignerPaths.empty() || !issuer.revocationListPaths.empty(),
-               "An issuer of the trust store has signers of revocation lists, but no path of one.");
-  CheckPaths(issuer.certificatePaths);
-  CheckPaths(issuer.revocationListPaths);
-  CheckPaths(issuer.listSignerPaths);
+void CheckEntry(const TrustedIssuer& entry, const std::string& name) {
+  CheckName(entry, name);
+  RequireTrust(!entry.certificates.empty() || !entry.certificatePaths.empty(),
+               "The " + name + " has neither a certificate nor a path of one.");
+  const auto null = std::find(entry.certificates.begin(), entry.certificates.end(), nullptr);
+  RequireTrust(null == entry.certificates.end(),
+               "The certificate certificates[" + std::to_string(null - entry.certificates.begin()) +
+                   "] of the " + name + " is null.");
+  RequireTrust(entry.listSignerPaths.empty() || !entry.revocationListPaths.empty(),
+               "The " + name + " has signers of revocation lists, but no path of a list.");
+  CheckPaths(entry.certificatePaths, "certificatePaths", name);
+  CheckPaths(entry.revocationListPaths, "revocationListPaths", name);
+  CheckPaths(entry.listSignerPaths, "listSignerPaths", name);
 }
 
 void MakeAbsolute(std::vector<std::string>& paths) {
@@ -62,10 +80,23 @@ void MakeAbsolute(std::vector<std::string>& paths) {
 }  // namespace
 
 void CheckTrustConfig(const TrustStoreConfig& config) {
-  RequireTrust(!config.issuers.empty(), "The trust store has no issuer.");
-  for (const TrustedIssuer& issuer : config.issuers) {
-    CheckIssuer(issuer);
+  RequireTrust(!config.issuers.empty(), "The trust store has no entry.");
+  for (std::size_t i = 0; i < config.issuers.size(); ++i) {
+    CheckEntry(config.issuers[i], EntryText(config.issuers[i], i));
   }
+}
+
+void ThrowNoCertificate(const TrustStoreConfig& config) {
+  std::string text;
+  for (std::size_t i = 0; i < config.issuers.size(); ++i) {
+    const TrustedIssuer& entry = config.issuers[i];
+    for (const std::string& path : entry.certificatePaths) {
+      text += (text.empty() ? "'" : ", '") + path + "' (issuers[" + std::to_string(i) + "], " +
+              IssuerText(entry.issuer) + ")";
+    }
+  }
+  throw Tarnik::InvalidArgumentException(
+      "The trust store has no certificate. Its entries contain none in " + text + ".");
 }
 
 void MakePathsAbsolute(TrustStoreConfig& config) {

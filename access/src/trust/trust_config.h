@@ -9,6 +9,9 @@ namespace SsoClient::Access {
 /// without looking at files.
 void CheckTrustConfig(const TrustStoreConfig& config);
 
+/// Throws `Tarnik::InvalidArgumentException` for entries whose folders contain no certificate.
+[[noreturn]] void ThrowNoCertificate(const TrustStoreConfig& config);
+
 /// Makes all paths absolute, so that they stay the same when the process changes its folder.
 /// Throws `Tarnik::IOException` when the current folder is unknown.
 void MakePathsAbsolute(TrustStoreConfig& config);

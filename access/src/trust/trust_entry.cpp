@@ -1,10 +1,12 @@
 #include "trust/trust_entry.h"
 
 #include <algorithm>
+#include <cstddef>
 #include <string_view>
 #include <utility>
 
 #include <tarnik/crypto/crypto_exception.h>
+#include <tarnik/text/display_text.h>
 
 namespace SsoClient::Access {
 
@@ -13,6 +15,8 @@ namespace {
 using Tarnik::Ref;
 using Tarnik::Crypto::Certificate;
 using Tarnik::Crypto::RevocationList;
+
+constexpr std::size_t kLongestIssuer = 200;
 
 [[noreturn]] void ThrowUnusable(const std::string& path, const std::string& why) {
   throw Tarnik::Crypto::CryptoException("The trust file '" + path + "' cannot be used: " + why);
@@ -46,6 +50,12 @@ const Certificate* SignerOf(const RevocationList& list,
   return found == signers.end() ? nullptr : found->get();
 }
 
+std::string WhyUnsigned(const RevocationList& list, const TrustContents::Entry& contents) {
+  const std::string why = "No certificate of the entry has signed the revocation list of '" +
+                          Tarnik::ToDisplayText(list.IssuerName(), kLongestIssuer) + "'.";
+  return contents.listSigners.empty() ? why + " The entry has no list signers." : why;
+}
+
 }  // namespace
 
 TrustEntry DecodeEntry(const TrustedIssuer& issuer, const TrustContents::Entry& contents) {
@@ -74,7 +84,7 @@ TrustEntry DecodeEntry(const TrustedIssuer& issuer, const TrustContents::Entry& 
     for (const auto& list : lists) {
       const Certificate* const signer = SignerOf(*list, listSigners);
       if (signer == nullptr) {
-        ThrowUnusable(file.path, "No certificate of the entry has signed the revocation list.");
+        ThrowUnusable(file.path, WhyUnsigned(*list, contents));
       }
       entry.lists.push_back({list, Tarnik::Crypto::Fingerprint(*signer)});
     }

@@ -41,7 +41,8 @@ class WatchedTrustStore final : public TrustStoreImpl {
   TrustDescription Describe() const override {
     Follow();
     const auto state = parts_->cell.Get();
-    return {state->trust->signers, state->loadedAt, state->failure};
+    const Trust& trust = *state->trust;
+    return {trust.signers, trust.issuersWithoutSigners, state->loadedAt, state->failure};
   }
 
   std::shared_ptr<const TrustSnapshot> Current() const override {
@@ -91,8 +92,8 @@ std::shared_ptr<TrustStoreImpl> CreateTrustStore(TrustStoreConfig config,
   MakePathsAbsolute(config);
   TrustListing listing;
   auto trust = BuildTrust(config.issuers, ReadUnchanged(config.issuers, listing));
-  if (trust->fingerprints.empty()) {
-    throw Tarnik::InvalidArgumentException("The trust store has no certificate.");
+  if (trust->signers.empty()) {
+    ThrowNoCertificate(config);
   }
   auto state = MakeTrustState(std::move(trust), runtime->Now().wall);
   return std::make_shared<WatchedTrustStore>(

@@ -1,5 +1,7 @@
+#include "trust/trust_text.h"
+
+#include <algorithm>
 #include <cstddef>
-#include <string>
 
 #include <ssoclient/access/trust_store.h>
 #include <tarnik/crypto/certificate.h>
@@ -28,16 +30,24 @@ std::string RevocationOf(const TrustedSigner& signer) {
 
 std::string TextOf(const TrustedSigner& signer) {
   const Tarnik::Crypto::Certificate& certificate = *signer.certificate;
-  return (signer.issuer.empty() ? "any issuer" : "'" + ForPeople(signer.issuer) + "'") + ": " +
-         ForPeople(certificate.SubjectName()) + ", serial number " +
-         ForPeople(certificate.SerialNumber()) + ", " +
+  return IssuerText(signer.issuer) + ": " + ForPeople(certificate.SubjectName()) +
+         ", serial number " + ForPeople(certificate.SerialNumber()) + ", " +
          (signer.path.empty() ? "given as an object" : "from '" + ForPeople(signer.path) + "'") +
          "\n  valid from " + certificate.NotBefore().ToString() + " to " +
          certificate.NotAfter().ToString() + ", " + RevocationOf(signer) + ", SHA-256 " +
          Tarnik::Crypto::FingerprintText(certificate) + "\n";
 }
 
+std::string TextOfIssuerWithoutSigners(const std::string& issuer, bool hasSignersOfAny) {
+  return IssuerText(issuer) + (hasSignersOfAny ? ": only the signers of any issuer are trusted\n"
+                                               : ": nobody is trusted\n");
+}
+
 }  // namespace
+
+std::string IssuerText(const std::string& issuer) {
+  return issuer.empty() ? "any issuer" : "'" + ForPeople(issuer) + "'";
+}
 
 std::string TrustDescription::ToString() const {
   std::string text = "Trust read at " + loadedAt.ToString() + ", " +
@@ -48,6 +58,12 @@ std::string TrustDescription::ToString() const {
   }
   for (const TrustedSigner& signer : signers) {
     text += TextOf(signer);
+  }
+  const bool hasSignersOfAny =
+      std::any_of(signers.begin(), signers.end(),
+                  [](const TrustedSigner& signer) { return signer.issuer.empty(); });
+  for (const std::string& issuer : issuersWithoutSigners) {
+    text += TextOfIssuerWithoutSigners(issuer, hasSignersOfAny);
   }
   return text;
 }

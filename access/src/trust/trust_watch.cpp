@@ -14,8 +14,20 @@ namespace {
 
 std::size_t CountMissing(const Trust& trust, const Trust& other) {
   return static_cast<std::size_t>(
-      std::count_if(trust.fingerprints.begin(), trust.fingerprints.end(),
-                    [&other](const auto& digest) { return !other.fingerprints.contains(digest); }));
+      std::count_if(trust.identities.begin(), trust.identities.end(),
+                    [&other](const auto& signer) { return !other.identities.contains(signer); }));
+}
+
+TrustRecord RecordOf(const TrustStoreConfig& config, const Trust& trust) {
+  TrustRecord record;
+  record.store = config.name;
+  record.issuersWithoutSigners = trust.issuersWithoutSigners;
+  record.signers = trust.signers.size();
+  for (const TrustedSigner& signer : trust.signers) {
+    record.revoked += signer.revokedSince ? 1 : 0;
+    record.uncovered += signer.isRevocationChecked && !signer.listUntil ? 1 : 0;
+  }
+  return record;
 }
 
 }  // namespace
@@ -161,11 +173,9 @@ void TrustWatch::ReadAll(TrustListing& listing) {
 
 void TrustWatch::Replace(std::shared_ptr<const Trust> trust) {
   const auto previous = parts_->cell.Get();
-  TrustRecord record;
-  record.store = parts_->config.name;
+  TrustRecord record = RecordOf(parts_->config, *trust);
   record.added = CountMissing(*trust, *previous->trust);
   record.removed = CountMissing(*previous->trust, *trust);
-  record.signers = trust->fingerprints.size();
   const bool isNews = trust != previous->trust || !previous->failure.empty();
   parts_->cell.Set(MakeTrustState(std::move(trust), parts_->runtime->Now().wall));
   reported_ = {};
@@ -182,10 +192,8 @@ void TrustWatch::Keep(const TrustListing& listing, const std::string& failure) {
   if (failure == reportedFailure_ && listing == reported_) {
     return;
   }
-  TrustRecord record;
-  record.store = parts_->config.name;
+  TrustRecord record = RecordOf(parts_->config, *previous->trust);
   record.failure = failure;
-  record.signers = previous->trust->fingerprints.size();
   reported_ = listing;
   reportedFailure_ = failure;
   Tell(record);

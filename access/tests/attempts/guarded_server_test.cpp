@@ -283,7 +283,7 @@ TEST_F(GuardedServerThreadTest, FollowsTheTrustedCertificates) {
   EXPECT_EQ(Send(InHeader(token)).status, 200);
   const auto begin = std::chrono::steady_clock::now();
   ReplaceTrust(Stranger().certificatePem);
-  server_->AwaitInLog("the trust is that of the files: 1 certificates, 1 added, 1 removed");
+  server_->AwaitInLog("the trust is that of the files: 1 signer, 1 added, 1 removed");
   EXPECT_EQ(Send(InHeader(token)).challenge, kInvalid);
   server_->AwaitInLog(": refused (unknown-signer): ");
   // Within a second, unless the machine is busy.

@@ -87,15 +87,31 @@ TEST_F(TrustBuilderTest, ListsOfAnEntryForAnyIssuerCountForTheSameCertificateEls
   EXPECT_EQ(store->Describe().signers.size(), 2U);
 }
 
-TEST_F(TrustBuilderTest, CertificateInTwoEntriesCountsOnceInRecords) {
+TEST_F(TrustBuilderTest, CertificateInTwoEntriesOfAnIssuerCountsOnceInRecords) {
   Put("trust/b.pem", Sts(1).Pem());
-  config.issuers.push_back(EntryOf(kOther, {1}));
+  config.issuers.push_back(EntryOf(kIssuer, {1}));
   Make();
   Put("trust/c.pem", Sts(1).Pem() + Sts(2).Pem());
   store->Reload();
   ASSERT_EQ(listener->replaced.size(), 1U);
   EXPECT_EQ(listener->replaced[0].added, 1U);
   EXPECT_EQ(listener->replaced[0].signers, 3U);
+}
+
+TEST_F(TrustBuilderTest, CertificateOfTwoIssuersCountsTwiceInRecords) {
+  config.issuers.push_back(EntryOf(kOther, {1}));
+  Make();
+  Put("trust/b.pem", Sts(1).Pem());
+  store->Reload();
+  ASSERT_EQ(listener->replaced.size(), 1U);
+  EXPECT_EQ(listener->replaced[0].added, 1U);
+  EXPECT_EQ(listener->replaced[0].signers, 3U);
+  EXPECT_EQ(store->Describe().signers.size(), 3U);
+  Remove("trust/b.pem");
+  store->Reload();
+  ASSERT_EQ(listener->replaced.size(), 2U);
+  EXPECT_EQ(listener->replaced[1].removed, 1U);
+  EXPECT_EQ(listener->replaced[1].signers, 2U);
 }
 
 TEST_F(TrustBuilderTest, SignerHasThePeriodAndTheNameOfItsCertificate) {

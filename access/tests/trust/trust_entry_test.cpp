@@ -33,7 +33,7 @@ class TrustEntryTest : public TrustFixture {
 
   static constexpr const char* kForeignList =
       "The trust file '/lists/a.crl' cannot be used: No certificate of the entry has signed the "
-      "revocation list.";
+      "revocation list of 'CN=Authority'.";
 
   std::shared_ptr<const TrustSnapshot> snapshot;
 };
@@ -107,6 +107,32 @@ TEST_F(TrustEntryTest, ListThatIsAddedCounts) {
   ASSERT_EQ(listener->replaced.size(), 1U);
   EXPECT_EQ(listener->replaced[0].added, 0U);
   EXPECT_EQ(listener->replaced[0].removed, 0U);
+  EXPECT_EQ(listener->replaced[0].revoked, 1U);
+  EXPECT_EQ(listener->replaced[0].uncovered, 0U);
+}
+
+TEST_F(TrustEntryTest, RecordsCountWhoIsRevokedAndWhoHasNoList) {
+  Put("trust/b.pem", Sts(1).Pem());
+  Put("lists/a.crl", MakeCrl(TrustCa(), nullptr, -10, -100));
+  Make();
+  Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(1)));
+  store->Reload();
+  Put("trust/c.pem", Tarnik::Testing::MakeIdentity({}, nullptr).Pem());
+  store->Reload();
+  Remove("lists/a.crl");
+  store->Reload();
+  Put("lists/a.crl", "broken");
+  EXPECT_THROW(store->Reload(), CryptoException);
+  ASSERT_EQ(listener->replaced.size(), 3U);
+  EXPECT_EQ(listener->replaced[0].revoked, 1U);
+  EXPECT_EQ(listener->replaced[0].uncovered, 0U);
+  EXPECT_EQ(listener->replaced[1].revoked, 1U);
+  EXPECT_EQ(listener->replaced[1].uncovered, 1U);
+  EXPECT_EQ(listener->replaced[2].revoked, 0U);
+  EXPECT_EQ(listener->replaced[2].uncovered, 3U);
+  ASSERT_EQ(listener->kept.size(), 1U);
+  EXPECT_EQ(listener->kept[0].signers, 3U);
+  EXPECT_EQ(listener->kept[0].uncovered, 3U);
 }
 
 TEST_F(TrustEntryTest, ListThatIsRemovedNoLongerCovers) {
@@ -183,10 +209,19 @@ TEST_F(TrustEntryTest, ListOfAStrangerWithTheSameNameIsAnError) {
 TEST_F(TrustEntryTest, ListOfAnotherIssuerIsAnErrorUnlessItsSignerIsGiven) {
   const Identity other = Tarnik::Testing::MakeCa("Other");
   Put("lists/a.crl", MakeCrl(other, nullptr));
-  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] { Make(); })), kForeignList);
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] { Make(); })),
+            "The trust file '/lists/a.crl' cannot be used: No certificate of the entry has signed "
+            "the revocation list of 'CN=Other'.");
   config.issuers[0].listSignerPaths.push_back(Put("other.pem", other.Pem()));
   Make();
   EXPECT_FALSE(First().listUntil);
+}
+
+TEST_F(TrustEntryTest, ListWithoutAnyListSignerIsAnErrorThatSaysSo) {
+  config.issuers[0].listSignerPaths.clear();
+  Put("lists/a.crl", MakeCrl(TrustCa(), nullptr));
+  EXPECT_EQ(WithoutRoot(MessageOf<CryptoException>([this] { Make(); })),
+            std::string(kForeignList) + " The entry has no list signers.");
 }
 
 TEST_F(TrustEntryTest, TrustedCertificateMaySignItsOwnList) {

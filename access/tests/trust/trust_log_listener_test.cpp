@@ -33,15 +33,39 @@ TEST_F(TrustLogListenerTest, ReplacementsAreAtLevelFourAndFailuresAtLevelTwo) {
   record.store = "orders";
   record.added = 2;
   record.removed = 1;
-  record.signers = 3;
+  record.signers = 7;
+  record.revoked = 3;
+  record.uncovered = 4;
   listener->OnTrustReplaced(record);
   record.failure = "No.";
   listener->OnTrustKept(record);
   EXPECT_EQ(lines,
             (std::vector<std::string>{
-                "4 Store 'orders': the trust is that of the files: 3 certificates, 2 added, 1 "
-                "removed",
-                "2 Store 'orders': the trust stays as it was, 3 certificates: No."}));
+                "4 Store 'orders': the trust is that of the files: 7 signers, 2 added, 1 removed, "
+                "3 revoked, 4 without a revocation list",
+                "2 Store 'orders': the trust stays as it was, 7 signers: No."}));
+}
+
+TEST_F(TrustLogListenerTest, OneSignerIsSingular) {
+  const auto listener = CreateTrustLogListener();
+  TrustRecord record;
+  record.signers = 1;
+  listener->OnTrustReplaced(record);
+  listener->OnTrustKept(record);
+  EXPECT_EQ(lines,
+            (std::vector<std::string>{"4 Store '': the trust is that of the files: 1 signer, 0 "
+                                      "added, 0 removed, 0 revoked, 0 without a revocation list",
+                                      "2 Store '': the trust stays as it was, 1 signer: "}));
+}
+
+TEST_F(TrustLogListenerTest, IssuersWithoutSignersAreNamed) {
+  TrustRecord record;
+  record.issuersWithoutSigners = {"https://b\n", ""};
+  CreateTrustLogListener()->OnTrustReplaced(record);
+  EXPECT_EQ(lines, std::vector<std::string>{
+                       "4 Store '': the trust is that of the files: 0 signers, 0 added, 0 removed, "
+                       "0 revoked, 0 without a revocation list; without signers: 'https://b?', any "
+                       "issuer"});
 }
 
 TEST_F(TrustLogListenerTest, ListenerDoesNothingByDefault) {

@@ -40,7 +40,9 @@ TEST_F(TrustStoreTest, CertificatesAndFilesAreTrustedTogether) {
 
 TEST_F(TrustStoreTest, StoreWithoutCertificatesIsRefused) {
   Remove("trust/a.pem");
-  EXPECT_EQ(Refusal<InvalidArgumentException>(), "The trust store has no certificate.");
+  EXPECT_EQ(Refusal<InvalidArgumentException>(),
+            "The trust store has no certificate. Its entries contain none in '/trust' (issuers[0], "
+            "'https://sts.example').");
   Put("trust/a.pem", Sts(0).Pem());
   Make();
   EXPECT_EQ(Signers(), Names{"CN=sts-0"});
@@ -48,7 +50,7 @@ TEST_F(TrustStoreTest, StoreWithoutCertificatesIsRefused) {
 
 TEST_F(TrustStoreTest, BrokenConfigurationIsRefusedBeforeFilesAreRead) {
   config.issuers.clear();
-  EXPECT_EQ(Refusal<InvalidArgumentException>(), "The trust store has no issuer.");
+  EXPECT_EQ(Refusal<InvalidArgumentException>(), "The trust store has no entry.");
 }
 
 TEST_F(TrustStoreTest, PathThatDoesNotExistIsNamed) {
@@ -138,6 +140,28 @@ TEST_F(TrustStoreTest, ReloadAcceptsThatTheLastCertificateIsGone) {
   ASSERT_EQ(listener->replaced.size(), 1U);
   EXPECT_EQ(listener->replaced[0].removed, 1U);
   EXPECT_EQ(listener->replaced[0].signers, 0U);
+}
+
+TEST_F(TrustStoreTest, IssuerWhoseFolderIsEmptyIsDescribed) {
+  config.issuers.resize(2);
+  config.issuers[1].issuer = "https://b";
+  config.issuers[1].certificatePaths = {PathOf("b")};
+  std::filesystem::create_directory(PathOf("b"));
+  Make();
+  EXPECT_EQ(store->Describe().issuersWithoutSigners, Names{"https://b"});
+  Put("b/b.pem", Sts(1).Pem());
+  store->Reload();
+  EXPECT_EQ(store->Describe().issuersWithoutSigners, Names{});
+  Remove("trust/a.pem");
+  store->Reload();
+  EXPECT_EQ(store->Describe().issuersWithoutSigners, Names{kIssuer});
+  Put("b/b.pem", "broken");
+  EXPECT_THROW(store->Reload(), CryptoException);
+  ASSERT_EQ(listener->replaced.size(), 2U);
+  EXPECT_EQ(listener->replaced[0].issuersWithoutSigners, Names{});
+  EXPECT_EQ(listener->replaced[1].issuersWithoutSigners, Names{kIssuer});
+  ASSERT_EQ(listener->kept.size(), 1U);
+  EXPECT_EQ(listener->kept[0].issuersWithoutSigners, Names{kIssuer});
 }
 
 TEST_F(TrustStoreTest, DescriptionNamesTheFileOfEachSigner) {

@@ -55,6 +55,22 @@ TEST_F(TrustTextTest, SignerOfAnyIssuerThatWasGivenAsAnObject) {
   EXPECT_NE(text.find(", given as an object\n"), std::string::npos);
 }
 
+TEST_F(TrustTextTest, IssuersWithoutSignersAreTheLastLines) {
+  description.issuersWithoutSigners = {"https://b", "c\nd"};
+  const std::string before = Expected("revocation not checked");
+  EXPECT_EQ(description.ToString(),
+            before + "'https://b': nobody is trusted\n'c?d': nobody is trusted\n");
+  description.issuersWithoutSigners = {""};
+  EXPECT_EQ(description.ToString(), before + "any issuer: nobody is trusted\n");
+}
+
+TEST_F(TrustTextTest, IssuerWithoutSignersHasThoseOfAnyIssuer) {
+  signer().issuer.clear();
+  description.issuersWithoutSigners = {"https://b"};
+  const std::string text = description.ToString();
+  EXPECT_TRUE(text.ends_with("\n'https://b': only the signers of any issuer are trusted\n"));
+}
+
 TEST_F(TrustTextTest, FailureIsALineOfItsOwn) {
   description.signers.clear();
   description.failure = "No\nway.";

@@ -65,6 +65,10 @@ struct TrustedSigner {
 /// The trust in use, and the last attempt to read it.
 struct TrustDescription {
   std::vector<TrustedSigner> signers{};
+  /// `TrustedIssuer::issuer` of the entries of which no signer is above, since their folders
+  /// contain no certificate; empty for any issuer. Their tokens are refused, unless there are
+  /// signers of any issuer.
+  std::vector<std::string> issuersWithoutSigners{};
   Tarnik::System::DateTime loadedAt{};  ///< when the files were last read successfully
   /// Why the files as they are now were not accepted; empty if the trust in use is that of the
   /// files, as far as they have been looked at.
@@ -74,13 +78,19 @@ struct TrustDescription {
   SSOCLIENT_ACCESS_EXPORT std::string ToString() const;
 };
 
-/// Changed files have been read, or could not be.
+/// Changed files have been read, or could not be. The numbers are those of
+/// `TrustDescription::signers`: a certificate that is trusted for two issuers counts twice.
 struct TrustRecord {
-  std::string store{};      ///< `TrustStoreConfig::name`
-  std::string failure{};    ///< why the trust stays as it was; empty if it has been replaced
-  std::size_t added = 0;    ///< certificates, by their SHA-256
-  std::size_t removed = 0;  ///< certificates, by their SHA-256
-  std::size_t signers = 0;  ///< certificates in use now
+  std::string store{};    ///< `TrustStoreConfig::name`
+  std::string failure{};  ///< why the trust stays as it was; empty if it has been replaced
+  std::vector<std::string> issuersWithoutSigners{};  ///< as in `TrustDescription`
+  std::size_t added = 0;    ///< signers that were not trusted before, by issuer and SHA-256
+  std::size_t removed = 0;  ///< signers that are no longer trusted, by issuer and SHA-256
+  std::size_t signers = 0;  ///< signers in use now, with those that are revoked or uncovered
+  std::size_t revoked = 0;  ///< of them, those that are revoked
+  /// Of them, those that must be covered by a revocation list, but that no list covers. A list that
+  /// is out of date still covers.
+  std::size_t uncovered = 0;
 };
 
 /// Sees what a trust store does. The functions run on a worker thread of the platform, or on the
@@ -106,7 +116,7 @@ SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustListener> CreateTrustLogListener();
 struct TrustStoreConfig {
   /// Names the store in records and log lines; may be empty.
   std::string name{};
-  /// At least one, each with a certificate or the path of one.
+  /// The entries: at least one, each with a certificate or the path of one.
   std::vector<TrustedIssuer> issuers{};
   /// Whether the store looks for changes of the files by itself. It does so four times a second, by
   /// their metadata, and reads changed files when they have stayed the same for a quarter of a
@@ -139,14 +149,14 @@ class SSOCLIENT_ACCESS_EXPORT TrustStore {
   virtual TrustDescription Describe() const = 0;
 };
 
-/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no entry for an issuer,
-/// an entry names no issuer without `isForAnyIssuer`, or one with it, an entry has neither a
-/// certificate nor a path of one, a certificate is null, there is no certificate at all, since a
-/// gate would refuse every token, there are signers of lists but no path of a list, and when a path
-/// is empty or contains a NUL; `Tarnik::IOException` when a path does not exist or cannot be read,
-/// or the files change during each of several readings; `Tarnik::Crypto::CryptoException` when a
-/// file contains no certificate or list, or one that cannot be used; `Tarnik::ResourceException`
-/// when the system has too few descriptors. A message about a file names it.
+/// Reads all files. Throws `Tarnik::InvalidArgumentException` when there is no entry, an entry
+/// names no issuer without `isForAnyIssuer`, or one with it, an entry has neither a certificate nor
+/// a path of one, a certificate is null, there is no certificate at all, since a gate would refuse
+/// every token, there are signers of lists but no path of a list, and when a path is empty or
+/// contains a NUL; `Tarnik::IOException` when a path does not exist or cannot be read, or the files
+/// change during each of several readings; `Tarnik::Crypto::CryptoException` when a file contains
+/// no certificate or list, or one that cannot be used; `Tarnik::ResourceException` when the system
+/// has too few descriptors. A message names the file or the entry, by its index in `issuers`.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustStore> CreateTrustStore(TrustStoreConfig config);
 
 }  // namespace SsoClient::Access
