@@ -26,18 +26,24 @@ bool IsSaid(BearerTokens bearerTokens) noexcept {
 }  // namespace
 
 void CheckGateConfig(const GateConfig& config) {
-  RequireOfGate(config.trust != nullptr, "The trust store is null.");
+  RequireOfGate(config.trust != nullptr, "The trust store of the gate (trust) is null.");
   RequireOfGate(dynamic_cast<const TrustStoreImpl*>(config.trust.get()) != nullptr,
-                "The trust store was not created by CreateTrustStore.");
-  RequireOfGate(!config.audiences.empty(), "There is no audience.");
+                "The trust store of the gate (trust) was not created by CreateTrustStore.");
+  RequireOfGate(!config.audiences.empty(), "The gate has no audience (audiences).");
   RequireOfGate(std::none_of(config.audiences.begin(), config.audiences.end(),
                              [](const std::string& audience) { return audience.empty(); }),
-                "An audience is empty.");
-  RequireOfGate(IsSaid(config.bearerTokens), "It is not said whether bearer tokens are accepted.");
-  RequireOfGate(config.clockTolerance >= kNoTime, "The clock tolerance is negative.");
+                "An audience of the gate (audiences) is empty.");
+  RequireOfGate(IsSaid(config.bearerTokens),
+                "It is not said whether the gate accepts bearer tokens (bearerTokens).");
+  RequireOfGate(config.clockTolerance >= kNoTime,
+                "The clock tolerance of the gate (clockTolerance) is negative.");
   RequireOfGate(config.longestLifetime > kNoTime,
-                "The longest lifetime of a token is not positive.");
-  RequireOfGate(config.largestToken > 0, "The size of the largest token is 0.");
+                "The longest lifetime of the gate's tokens (longestLifetime) is not positive.");
+  RequireOfGate(std::none_of(config.allowedGroups.begin(), config.allowedGroups.end(),
+                             [](const PrincipalId& group) { return group.name.empty(); }),
+                "The name of an allowed group of the gate (allowedGroups) is empty.");
+  RequireOfGate(config.largestToken > 0,
+                "The size of the gate's largest token (largestToken) is 0.");
 }
 
 void LimitGateDurations(GateConfig& config) noexcept {

@@ -3,6 +3,8 @@
 #include <tarnik/core/exception.h>
 #include <tarnik/text/display_text.h>
 
+#include "certificate_text.h"
+
 namespace SsoClient::Access {
 
 namespace {
@@ -11,7 +13,7 @@ constexpr std::size_t kMaxShown = 120;
 
 std::string FingerprintOf(const Tarnik::Crypto::Certificate& certificate) {
   try {
-    return Tarnik::Crypto::FingerprintText(certificate);
+    return ShortFingerprint(certificate);
   } catch (const Tarnik::Exception&) {
     return "unknown";
   }

@@ -1,3 +1,4 @@
+#include "gate/claimed_signer.h"
 #include "gate/clock_rules.h"
 #include "gate/ledger_texts.h"
 #include "gate/shown_text.h"
@@ -73,7 +74,9 @@ std::string SignerKnownText(const VerdictFacts& facts) {
   const Signers signers = SelectSigners(*checked.trust, *checked.token);
   return "issuer " + ShownText(name) + "; of " + std::to_string(issuer->signers.size()) +
          " that may sign for it, the token may mean " +
-         (signers.empty() ? std::string("none") : NamesOf(signers));
+         (signers.empty()
+              ? "none; it names " + ClaimedSigner(checked.token->GetSignature()->KeyInfo())
+              : NamesOf(signers));
 }
 
 std::string SignerValidText(const VerdictFacts& facts) {

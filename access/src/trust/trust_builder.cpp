@@ -15,6 +15,7 @@
 #include <tarnik/system/date_time.h>
 #include <tarnik/text/display_text.h>
 
+#include "certificate_text.h"
 #include "trust/trust_entry.h"
 
 namespace SsoClient::Access {
@@ -42,7 +43,7 @@ Signer MakeSigner(const Ref<const Certificate>& certificate) {
   signer.notAfter = certificate->NotAfter();
   signer.resolver = Tarnik::Xml::Security::CreateTrustedCertificatesResolver({certificate});
   signer.name = Tarnik::ToDisplayText(certificate->SubjectName(), kLongestSubject) + " (SHA-256 " +
-                Tarnik::Crypto::FingerprintText(*certificate) + ")";
+                ShortFingerprint(*certificate) + ")";
   return signer;
 }
 

@@ -24,7 +24,7 @@ struct Signer {
   Tarnik::System::DateTime notAfter;
   /// Trusts only this certificate.
   Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> resolver;
-  /// "CN=sts (SHA-256 AB:CD:...)"
+  /// "CN=sts (SHA-256 AB:CD:EF:01:23:45:67:89...)"
   std::string name;
   /// The period of the list that covers the certificate; none without such a list.
   std::optional<Tarnik::System::DateTime> listFrom;

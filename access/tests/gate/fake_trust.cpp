@@ -70,7 +70,7 @@ Signer SignerOf(const DevSts::Credential& credential) {
   signer.notAfter = signer.certificate->NotAfter();
   signer.resolver = Tarnik::Xml::Security::CreateTrustedCertificatesResolver({signer.certificate});
   signer.name = signer.certificate->SubjectName() + " (SHA-256 " +
-                Tarnik::Crypto::FingerprintText(*signer.certificate) + ")";
+                Tarnik::Crypto::FingerprintText(*signer.certificate).substr(0, 23) + "...)";
   return signer;
 }
 

@@ -1,4 +1,5 @@
 #include <functional>
+#include <string>
 
 #include <tarnik/core/exception.h>
 
@@ -15,32 +16,62 @@ class OwnTrustStore final : public TrustStore {
 
 class GateConfigCheckTest : public GateFixture {
  protected:
-  void ExpectInvalid(const std::function<void(GateConfig&)>& change) const {
+  void ExpectInvalid(const std::function<void(GateConfig&)>& change,
+                     const std::string& message) const {
     GateConfig changed = config;
     change(changed);
-    EXPECT_THROW(CreateTokenGate(changed), Tarnik::InvalidArgumentException);
+    try {
+      CreateTokenGate(changed);
+      ADD_FAILURE() << "not thrown: " << message;
+    } catch (const Tarnik::InvalidArgumentException& e) {
+      EXPECT_EQ(e.Message(), message);
+    }
   }
 };
 
 TEST_F(GateConfigCheckTest, Trust) {
-  ExpectInvalid([](GateConfig& changed) { changed.trust = nullptr; });
-  ExpectInvalid([](GateConfig& changed) { changed.trust = std::make_shared<OwnTrustStore>(); });
+  ExpectInvalid([](GateConfig& changed) { changed.trust = nullptr; },
+                "The trust store of the gate (trust) is null.");
+  ExpectInvalid([](GateConfig& changed) { changed.trust = std::make_shared<OwnTrustStore>(); },
+                "The trust store of the gate (trust) was not created by CreateTrustStore.");
 }
 
 TEST_F(GateConfigCheckTest, Audiences) {
-  ExpectInvalid([](GateConfig& changed) { changed.audiences = {}; });
-  ExpectInvalid([](GateConfig& changed) { changed.audiences = {kAudience, ""}; });
+  ExpectInvalid([](GateConfig& changed) { changed.audiences = {}; },
+                "The gate has no audience (audiences).");
+  ExpectInvalid(
+      [](GateConfig& changed) {
+        changed.audiences = {kAudience, ""};
+      },
+      "An audience of the gate (audiences) is empty.");
 }
 
 TEST_F(GateConfigCheckTest, BearerTokens) {
-  ExpectInvalid([](GateConfig& changed) { changed.bearerTokens = BearerTokens::kNotSaid; });
-  ExpectInvalid([](GateConfig& changed) { changed.bearerTokens = static_cast<BearerTokens>(9); });
+  const std::string message =
+      "It is not said whether the gate accepts bearer tokens (bearerTokens).";
+  ExpectInvalid([](GateConfig& changed) { changed.bearerTokens = BearerTokens::kNotSaid; },
+                message);
+  ExpectInvalid([](GateConfig& changed) { changed.bearerTokens = static_cast<BearerTokens>(9); },
+                message);
 }
 
 TEST_F(GateConfigCheckTest, Numbers) {
-  ExpectInvalid([](GateConfig& changed) { changed.clockTolerance = std::chrono::seconds(-1); });
-  ExpectInvalid([](GateConfig& changed) { changed.longestLifetime = std::chrono::seconds(0); });
-  ExpectInvalid([](GateConfig& changed) { changed.largestToken = 0; });
+  ExpectInvalid([](GateConfig& changed) { changed.clockTolerance = std::chrono::seconds(-1); },
+                "The clock tolerance of the gate (clockTolerance) is negative.");
+  ExpectInvalid([](GateConfig& changed) { changed.longestLifetime = std::chrono::seconds(0); },
+                "The longest lifetime of the gate's tokens (longestLifetime) is not positive.");
+  ExpectInvalid([](GateConfig& changed) { changed.largestToken = 0; },
+                "The size of the gate's largest token (largestToken) is 0.");
+}
+
+TEST_F(GateConfigCheckTest, AllowedGroups) {
+  ExpectInvalid(
+      [](GateConfig& changed) {
+        changed.allowedGroups = {{"staff", "EXAMPLE"}, {}};
+      },
+      "The name of an allowed group of the gate (allowedGroups) is empty.");
+  config.allowedGroups = {{"staff", ""}};
+  EXPECT_NO_THROW(CreateTokenGate(config));
 }
 
 TEST_F(GateConfigCheckTest, DefaultsWithWhatMustBeSaid) {

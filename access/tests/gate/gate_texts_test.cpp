@@ -84,9 +84,9 @@ TEST_F(GateTextsTest, NamesEachPart) {
       Check(HolderOfKeyText(), Presenter::WithTlsCertificate(CertificateOf(HolderCredential())));
   const auto compared = [&verdict](CheckKind check) { return RecordOf(verdict, check).compared; };
   const std::string signer = SignerOf(TrustedCredential()).name;
-  const std::string holder = "CN=holder (SHA-256 " +
-                             Tarnik::Crypto::FingerprintText(*CertificateOf(HolderCredential())) +
-                             ")";
+  const std::string holder =
+      "CN=holder (SHA-256 " +
+      Tarnik::Crypto::FingerprintText(*CertificateOf(HolderCredential())).substr(0, 23) + "...)";
   EXPECT_EQ(compared(CheckKind::kLayout),
             "assertion '_a1' of 'https://sts.example.com/STS' about 'alice@example.com'");
   EXPECT_EQ(compared(CheckKind::kValidity), "from " +

@@ -54,7 +54,8 @@ struct GateConfig {
   std::chrono::seconds longestLifetime{std::chrono::hours{24 * 31}};
   /// The number of delegates in the token's delegation chain.
   std::size_t deepestDelegation = 10;
-  /// The token's subject must be in one of these groups, unless there is none here.
+  /// The token's subject must be in one of these groups, unless there is none here. None has an
+  /// empty name.
   std::vector<PrincipalId> allowedGroups{};
   /// The last check; may be empty. Returns whether the token is accepted; otherwise it may set
   /// `why`, which becomes the refusal's message. Called for each presentation of a token, on the
@@ -113,8 +114,8 @@ class SSOCLIENT_ACCESS_EXPORT TokenGate {
 };
 
 /// Throws `Tarnik::InvalidArgumentException` when the trust store is null or not one of
-/// `CreateTrustStore`, there is no audience or an empty one, `bearerTokens` is not said, and for a
-/// number that is outside its range.
+/// `CreateTrustStore`, there is no audience or an empty one, `bearerTokens` is not said, an allowed
+/// group has no name, and for a number that is outside its range.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TokenGate> CreateTokenGate(GateConfig config);
 
 }  // namespace SsoClient::Access
