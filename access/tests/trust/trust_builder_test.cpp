@@ -120,8 +120,9 @@ TEST_F(TrustBuilderTest, SignerHasThePeriodAndTheNameOfItsCertificate) {
   const Signer& signer = trust->Find(kIssuer)->signers[0];
   EXPECT_EQ(signer.notBefore, signer.certificate->NotBefore());
   EXPECT_EQ(signer.notAfter, signer.certificate->NotAfter());
-  EXPECT_EQ(signer.name,
-            "CN=sts-0 (SHA-256 " + Tarnik::Crypto::FingerprintText(*signer.certificate) + ")");
+  EXPECT_EQ(signer.name, "CN=sts-0 (SHA-256 " +
+                             Tarnik::Crypto::FingerprintText(*signer.certificate).substr(0, 23) +
+                             "...)");
   EXPECT_NE(signer.resolver->Resolve({}), nullptr);
 }
 
