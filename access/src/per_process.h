@@ -32,7 +32,7 @@ class PerProcess {
     return node != nullptr && node->generation == ForkGeneration() ? &node->value : nullptr;
   }
 
-  /// The object of this process, made with `make()` if there is none. Of several that threads make
+  /// The object of this process, made with `make()` on first use. Of several that threads make
   /// at once, one is used and the others are destroyed.
   template <class Make>
   T& Get(const Make& make) const {

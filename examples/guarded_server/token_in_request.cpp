@@ -32,7 +32,7 @@ bool IsSameWord(std::string_view a, std::string_view b) {
   return boost::beast::iequals({a.data(), a.size()}, {b.data(), b.size()});
 }
 
-/// The only child element with this name; null if there is none, or no parent.
+/// The only child element with this name; null without one, and without a parent.
 const ElementNode* OnlyChild(const ElementNode* parent, std::string_view uri,
                              std::string_view name) {
   const auto* const found = parent == nullptr ? nullptr : parent->FirstChildElement(uri, name);

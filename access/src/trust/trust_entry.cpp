@@ -42,7 +42,7 @@ std::vector<Ref<const Certificate>> DecodeCertificates(const FileContent& file) 
   });
 }
 
-// Null if it is none of them.
+// Null if no candidate has signed it.
 const Certificate* SignerOf(const RevocationList& list,
                             const std::vector<Ref<const Certificate>>& signers) {
   const auto found = std::find_if(signers.begin(), signers.end(),

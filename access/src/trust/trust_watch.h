@@ -74,7 +74,8 @@ class TrustWatch : public std::enable_shared_from_this<TrustWatch> {
   Tarnik::Ref<Tarnik::System::CancellableItem> timer_;
   Instant::Steady nextLook_{};  // used by the chain of timers and looks
 
-  // Held while files are read, and while the listener runs. An empty listing is none.
+  // Held while files are read, and while the listener runs. A listing is empty until
+  // there has been a look.
   std::mutex mutex_;
   TrustListing lastLook_;
   TrustListing settled_;         // read after two looks had found it

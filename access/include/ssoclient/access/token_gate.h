@@ -54,8 +54,8 @@ struct GateConfig {
   std::chrono::seconds longestLifetime{std::chrono::hours{24 * 31}};
   /// The number of delegates in the token's delegation chain.
   std::size_t deepestDelegation = 10;
-  /// The token's subject must be in one of these groups, unless there is none here. None has an
-  /// empty name.
+  /// The token's subject must be in one of these groups; if the list is empty, groups do not
+  /// matter. Names must not be empty.
   std::vector<PrincipalId> allowedGroups{};
   /// The last check; may be empty. Returns whether the token is accepted; otherwise it may set
   /// `why`, which becomes the refusal's message. Called for each presentation of a token, on the
