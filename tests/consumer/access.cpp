@@ -86,7 +86,7 @@ bool RefusesAGateWithoutTrust() {
   try {
     SsoClient::Access::CreateTokenGate({});
   } catch (const Tarnik::InvalidArgumentException& e) {
-    return std::string(e.what()) == "The trust store is null.";
+    return std::string(e.what()) == "The trust store of the gate (trust) is null.";
   }
   return false;
 }

@@ -2,8 +2,10 @@
 // a check that begins after a change has that trust.
 #include <array>
 #include <atomic>
+#include <chrono>
 #include <filesystem>
 #include <thread>
+#include <vector>
 
 #include <ssoclient/access/trust_store.h>
 
@@ -17,7 +19,7 @@ namespace {
 using Tarnik::Testing::Identity;
 using Tarnik::Testing::MakeCrl;
 
-constexpr std::size_t kStates = 4;
+constexpr std::size_t kStates = 5;
 constexpr int kThreads = 4;
 constexpr int kChanges = 40;
 
@@ -28,20 +30,25 @@ struct State {
   bool hasSecond;
   bool isFirstRevoked;
   std::array<Reason, 3> reasons;
+  long listUntil = 3600;  ///< seconds from now
 };
 
 constexpr std::array<State, kStates> kAllStates{
     {{true, false, false, {Reason::kNone, Reason::kUnknownSigner, Reason::kBadSignature}},
      {true, true, false, {Reason::kNone, Reason::kNone, Reason::kBadSignature}},
      {false, true, false, {Reason::kUnknownSigner, Reason::kNone, Reason::kUnknownSigner}},
-     {true, true, true, {Reason::kSignerRevoked, Reason::kNone, Reason::kSignerRevoked}}}};
+     {true, true, true, {Reason::kSignerRevoked, Reason::kNone, Reason::kSignerRevoked}},
+     {true,
+      true,
+      false,
+      {Reason::kRevocationUnknown, Reason::kRevocationUnknown, Reason::kRevocationUnknown},
+      -600}}};
 
 class TrustChangesThreadTest : public AttackFixture {
  protected:
   TrustChangesThreadTest() {
     std::filesystem::create_directory(root.Path() + "/trust");
     Write(kAllStates[0]);
-    TrustStoreConfig store;
     store.issuers.resize(1);
     store.issuers[0].issuer = kTokenIssuer;
     store.issuers[0].certificatePaths = {root.Path() + "/trust"};
@@ -56,7 +63,8 @@ class TrustChangesThreadTest : public AttackFixture {
   void Write(const State& state) const {
     Replace("trust/signers.pem", (state.hasFirst ? first.Pem() : std::string()) +
                                      (state.hasSecond ? second.Pem() : std::string()));
-    Replace("list.crl", MakeCrl(authority, state.isFirstRevoked ? &first : nullptr));
+    Replace("list.crl",
+            MakeCrl(authority, state.isFirstRevoked ? &first : nullptr, state.listUntil, -7200));
   }
   void Replace(const std::string& name, const std::string& content) const {
     std::filesystem::rename(root.Write("new", content), root.Path() + "/" + name);
@@ -65,18 +73,71 @@ class TrustChangesThreadTest : public AttackFixture {
     return text.ToSignedXml({signer.Pem(), signer.KeyPem()});
   }
 
+  /// Damages the files, in a way for each number, while the trust stays as it was.
+  void Damage(int number) {
+    const int way = (number + number / 5) % 5;
+    const std::string folder = root.Path() + "/trust";
+    const std::string file = folder + "/signers.pem";
+    switch (way) {
+      case 0:  // half written
+        Replace("trust/more.pem", second.Pem().substr(0, 200));
+        break;
+      case 1:  // a certificate that is whole, and one that is not
+        Replace("trust/more.pem", second.Pem() + first.Pem().substr(0, 300));
+        break;
+      case 2:
+        std::filesystem::rename(folder, root.Path() + "/elsewhere");
+        break;
+      case 3:  // unreadable
+        std::filesystem::create_symlink("nowhere", folder + "/more.pem");
+        break;
+      default:  // a list by a stranger
+        Replace("list.crl", MakeCrl(stranger, &second));
+    }
+    EXPECT_THROW(config.trust->Reload(), Tarnik::Exception) << way;
+    AwaitChecks();
+    if (way == 2) {
+      std::filesystem::rename(root.Path() + "/elsewhere", folder);
+    }
+    std::filesystem::remove(folder + "/more.pem");
+  }
+  /// Returns after as many further checks as there are threads.
+  void AwaitChecks() const {
+    const int enough = checks_ + kThreads;
+    while (checks_ < enough) {
+      std::this_thread::yield();
+    }
+  }
+
   // Even between changes, when the state is that of `phase_ / 2`; odd during a change.
-  void ChangeAll() {
-    for (int change = 1; change <= kChanges; ++change) {
+  template <class Adopt>
+  void ChangeAll(int changes, const Adopt& adopt) {
+    for (int change = 1; change <= changes; ++change) {
+      const State& state = kAllStates[static_cast<std::size_t>(change) % kStates];
       ++phase_;
-      Write(kAllStates[static_cast<std::size_t>(change) % kStates]);
-      config.trust->Reload();
+      Write(state);
+      adopt(state);
       ++phase_;
-      while (checks_.load() < change * kThreads) {
-        std::this_thread::yield();
-      }
+      AwaitChecks();
+      Damage(change);
     }
     isDone_ = true;
+  }
+  template <class Adopt>
+  void CheckWhileChanging(int changes, const Adopt& adopt) {
+    const auto gate = Make();
+    std::vector<std::thread> threads;
+    for (int i = 0; i < kThreads; ++i) {
+      threads.emplace_back([&] { CheckUntilDone(*gate); });
+    }
+    ChangeAll(changes, [&](const State& state) { adopt(*gate, state); });
+    for (std::thread& thread : threads) {
+      thread.join();
+    }
+    EXPECT_EQ(impossible_, 0);
+    EXPECT_EQ(incomplete_, 0);
+    EXPECT_GT(accepted_, 0);
+    EXPECT_LT(accepted_, checks_);
   }
 
   static bool IsPossible(Reason reason, std::size_t token, int before, int after) {
@@ -105,6 +166,8 @@ class TrustChangesThreadTest : public AttackFixture {
   }
 
   const Tarnik::Testing::TemporaryFolder root;
+  TrustStoreConfig store;
+  const Identity stranger = Tarnik::Testing::MakeCa("Authority");
   const Identity authority = Tarnik::Testing::MakeCa("Authority");
   const Identity first = Tarnik::Testing::MakeIdentity({.commonName = "first"}, &authority);
   const Identity second = Tarnik::Testing::MakeIdentity({.commonName = "second"}, &authority);
@@ -120,19 +183,27 @@ class TrustChangesThreadTest : public AttackFixture {
 };
 
 TEST_F(TrustChangesThreadTest, EachVerdictIsOneOfACompleteTrust) {
-  const auto gate = Make();
-  std::vector<std::thread> threads;
-  for (int i = 0; i < kThreads; ++i) {
-    threads.emplace_back([&] { CheckUntilDone(*gate); });
-  }
-  ChangeAll();
-  for (std::thread& thread : threads) {
-    thread.join();
-  }
-  EXPECT_EQ(impossible_, 0);
-  EXPECT_EQ(incomplete_, 0);
-  EXPECT_GT(accepted_, 0);
-  EXPECT_LT(accepted_, checks_);
+  CheckWhileChanging(kChanges, [this](const TokenGate&, const State&) { config.trust->Reload(); });
+}
+
+TEST_F(TrustChangesThreadTest, EachVerdictOfAWatchedTrustIsOneOfACompleteTrust) {
+  store.isWatching = true;
+  config.trust = CreateTrustStore(store);
+  const auto hasReasons = [this](const TokenGate& gate, const State& state) {
+    for (std::size_t token = 0; token < tokens.size(); ++token) {
+      if (gate.Check(tokens.at(token), Presenter::Nobody()).Refusal() != state.reasons.at(token)) {
+        return false;
+      }
+    }
+    return true;
+  };
+  CheckWhileChanging(kStates, [&](const TokenGate& gate, const State& state) {
+    const auto limit = std::chrono::steady_clock::now() + std::chrono::seconds(30);
+    while (!hasReasons(gate, state) && std::chrono::steady_clock::now() < limit) {
+      std::this_thread::sleep_for(std::chrono::milliseconds(10));
+    }
+    EXPECT_TRUE(hasReasons(gate, state));
+  });
 }
 
 TEST_F(TrustChangesThreadTest, EachStateHasItsReasons) {
