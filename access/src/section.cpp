@@ -19,12 +19,12 @@ void CancelUnlessNull(const Tarnik::Ref<Item>& item) noexcept {
   }
 }
 
-// Takes the first element of a list through the objects themselves.
+// Takes the first element of a list through the objects themselves; `next` is that of the element.
 template <class Object>
 std::shared_ptr<Object> TakeFirst(std::shared_ptr<Object>& first, Object*& last,
-                                  std::shared_ptr<Object> Object::*next) noexcept {
+                                  std::shared_ptr<Object>& next) noexcept {
   std::shared_ptr<Object> taken = std::move(first);
-  first = std::exchange(taken.get()->*next, nullptr);
+  first = std::exchange(next, nullptr);
   if (first == nullptr) {
     last = nullptr;
   }
@@ -70,14 +70,14 @@ void Section::Finish() noexcept {
   AnswerAll();
   CancelEnded();
   while (firstStarted_ != nullptr) {
-    RunOrFail(TakeFirst(firstStarted_, lastStarted_, &Request::nextStarted));
+    RunOrFail(TakeFirst(firstStarted_, lastStarted_, firstStarted_->nextStarted));
   }
   ReportAll();
 }
 
 void Section::AnswerAll() noexcept {
   while (firstAnswered_ != nullptr) {
-    const WaiterPtr waiter = TakeFirst(firstAnswered_, lastAnswered_, &Waiter::nextAnswered);
+    const WaiterPtr waiter = TakeFirst(firstAnswered_, lastAnswered_, firstAnswered_->nextAnswered);
     const auto timer = std::exchange(waiter->deadlineTimer, nullptr);
     waiter->Receive(std::move(waiter->dueAnswer));
     CancelUnlessNull(timer);
@@ -87,7 +87,7 @@ void Section::AnswerAll() noexcept {
 void Section::CancelEnded() noexcept {
   const bool hasBase = std::holds_alternative<TokenLogin>(core_.config_->login);
   while (firstEnded_ != nullptr) {
-    const RequestPtr request = TakeFirst(firstEnded_, lastEnded_, &Request::nextEnded);
+    const RequestPtr request = TakeFirst(firstEnded_, lastEnded_, firstEnded_->nextEnded);
     CancelUnlessNull(std::exchange(request->endedLimit, nullptr));
     CancelUnlessNull(std::exchange(request->endedPause, nullptr));
     if (hasBase) {
