@@ -1,0 +1,11 @@
+#include "commands/command.h"
+
+#include <CLI/CLI.hpp>
+
+namespace SsoClient::Tool {
+
+void Command::AddJsonOption(CLI::App& command) {
+  command.add_flag("--json", wantsJson_, "Print one JSON object instead of text");
+}
+
+}  // namespace SsoClient::Tool

@@ -1,0 +1,67 @@
+#include "failure.h"
+
+#include <utility>
+
+#include <ssoclient/access/failure_kind.h>
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
+
+namespace SsoClient::Tool {
+namespace {
+
+using Access::FailureKind;
+
+ExitStatus StatusOf(FailureKind kind) {
+  switch (kind) {
+    case FailureKind::kRefusedLogin:
+    case FailureKind::kExpiredPassword:
+    case FailureKind::kFault:
+      return ExitStatus::kRefused;
+    case FailureKind::kSecretFailed:
+    case FailureKind::kAbandoned:
+    case FailureKind::kLocal:
+      return ExitStatus::kLocal;
+    default:
+      return ExitStatus::kUnreachable;
+  }
+}
+
+std::string RemedyFor(FailureKind kind) {
+  switch (kind) {
+    case FailureKind::kRefusedLogin:
+      return "check the user name, the password or the key";
+    case FailureKind::kExpiredPassword:
+      return "set a new password at the service";
+    case FailureKind::kUnreachable:
+    case FailureKind::kTlsTrust:
+    case FailureKind::kTlsName:
+    case FailureKind::kTls:
+    case FailureKind::kHttpStatus:
+    case FailureKind::kBadAnswer:
+      return "run 'ssoclient doctor' with the same URL and CA";
+    case FailureKind::kTimedOut:
+      return "run 'ssoclient doctor', or allow more time with --timeout";
+    case FailureKind::kBadToken:
+      return "check the signing certificate of the service (--sts-certificate)";
+    default:
+      return "";
+  }
+}
+
+}  // namespace
+
+ToolException::ToolException(Failure failure)
+    : std::runtime_error(failure.message), failure_(std::move(failure)) {}
+
+Failure FailureOf(const std::exception& exception) {
+  if (const auto* own = dynamic_cast<const ToolException*>(&exception)) {
+    return own->What();
+  }
+  if (const auto* known = dynamic_cast<const Tarnik::Exception*>(&exception)) {
+    const FailureKind kind = Access::Classify(*known);
+    return {StatusOf(kind), Access::NameOf(kind), known->what(), RemedyFor(kind)};
+  }
+  return {ExitStatus::kLocal, "local", exception.what(), ""};
+}
+
+}  // namespace SsoClient::Tool

@@ -1,0 +1,36 @@
+#ifndef SSOCLIENT_TOOL_FAILURE_H
+#define SSOCLIENT_TOOL_FAILURE_H
+
+#include <exception>
+#include <stdexcept>
+#include <string>
+
+#include "exit_status.h"
+
+namespace SsoClient::Tool {
+
+/// Why a command failed. The texts contain no secret and no token text.
+struct Failure {
+  ExitStatus status = ExitStatus::kLocal;
+  /// For programs, in lower case with hyphens, such as "refused-login" or "token-file-open".
+  std::string kind{};
+  std::string message{};  ///< one line for people
+  std::string remedy{};   ///< what the user can do; may be empty
+};
+
+/// Thrown by the parts of the program for failures of their own.
+class ToolException : public std::runtime_error {
+ public:
+  explicit ToolException(Failure failure);
+  const Failure& What() const noexcept { return failure_; }
+
+ private:
+  Failure failure_;
+};
+
+/// The failure that an exception of this program or of the libraries means.
+Failure FailureOf(const std::exception& exception);
+
+}  // namespace SsoClient::Tool
+
+#endif
