@@ -1,8 +1,8 @@
 # ssoclient_install_package(NAME ... TARGET ... HEADERS ... DESCRIPTION ... [REQUIRES ...] [DEPENDENCIES ...]): installs
 # a shared library with its headers, a CMake package and a pkg-config file, as a component with the package's name.
-# REQUIRES names pkg-config packages; each entry of DEPENDENCIES names a CMake package and its version.
+# HEADERS are folders, REQUIRES names pkg-config packages; each entry of DEPENDENCIES names a CMake package and its version.
 function(ssoclient_install_package)
-  cmake_parse_arguments(PARSE_ARGV 0 PACKAGE "" "NAME;TARGET;HEADERS;DESCRIPTION" "REQUIRES;DEPENDENCIES")
+  cmake_parse_arguments(PARSE_ARGV 0 PACKAGE "" "NAME;TARGET;DESCRIPTION" "HEADERS;REQUIRES;DEPENDENCIES")
   if(NOT SSOCLIENT_INSTALL)
     return()
   endif()

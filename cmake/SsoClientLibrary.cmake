@@ -2,19 +2,20 @@ include("${CMAKE_CURRENT_LIST_DIR}/SsoClientInstall.cmake")
 include("${CMAKE_CURRENT_LIST_DIR}/SsoClientTarget.cmake")
 
 # ssoclient_add_library(NAME PACKAGE ... SOURCES ... INCLUDES ... HEADERS ... VERSION_SCRIPT ... DESCRIPTION ...
-#                       [GENERATED ...] [DEFINITIONS ...]
+#                       [GENERATED ...] [VERSION_HEADER ...] [DEFINITIONS ...]
 #                       [PUBLIC_LIBRARIES ...] [PRIVATE_LIBRARIES ...] [REQUIRES ...] [DEPENDENCIES ...])
 # adds libNAME.so, which is installed as PACKAGE and linked as PACKAGE::NAME, from every source below the folder SOURCES:
 #   NAME          the shared library, which exports what VERSION_SCRIPT lists
 #   NAME_objects  its object files
 #   NAME_static   the same object files with the include folders of SOURCES, for tests of what the shared library hides
 # with each "-" of NAME replaced by "_" in the latter two. INCLUDES is the folder of the public headers, HEADERS the
-# folder below it that is installed, GENERATED a folder of generated private headers. The libraries are those to link;
-# REQUIRES and DEPENDENCIES are passed to ssoclient_install_package. SEPARATE_FOR_TESTS compiles each source on its own
-# in a build with tests, which replace functions of one source that other sources call.
+# folder below it that is installed, GENERATED a folder of generated private headers, and VERSION_HEADER the name of a
+# public header that is made from a template of this name, with ".in" appended, in INCLUDES. The libraries are those to
+# link; REQUIRES and DEPENDENCIES are passed to ssoclient_install_package. SEPARATE_FOR_TESTS compiles each source on
+# its own in a build with tests, which replace functions of one source that other sources call.
 function(ssoclient_add_library name)
   cmake_parse_arguments(PARSE_ARGV 1 LIBRARY "SEPARATE_FOR_TESTS"
-    "PACKAGE;SOURCES;INCLUDES;HEADERS;VERSION_SCRIPT;DESCRIPTION;GENERATED"
+    "PACKAGE;SOURCES;INCLUDES;HEADERS;VERSION_SCRIPT;DESCRIPTION;GENERATED;VERSION_HEADER"
     "DEFINITIONS;PUBLIC_LIBRARIES;PRIVATE_LIBRARIES;REQUIRES;DEPENDENCIES")
   string(REPLACE "-" "_" prefix "${name}")
   file(GLOB_RECURSE sources CONFIGURE_DEPENDS "${LIBRARY_SOURCES}/*.cpp")
@@ -26,9 +27,17 @@ function(ssoclient_add_library name)
   add_library(${prefix}_static STATIC EXCLUDE_FROM_ALL $<TARGET_OBJECTS:${prefix}_objects>)
   target_include_directories(${prefix}_static INTERFACE "${LIBRARY_SOURCES}" ${LIBRARY_GENERATED})
 
+  set(include_folders "${LIBRARY_INCLUDES}")
+  if(LIBRARY_VERSION_HEADER)
+    set(generated_includes "${CMAKE_CURRENT_BINARY_DIR}/include")
+    configure_file("${LIBRARY_INCLUDES}/${LIBRARY_VERSION_HEADER}.in" "${generated_includes}/${LIBRARY_VERSION_HEADER}" @ONLY)
+    list(APPEND include_folders "${generated_includes}")
+    cmake_path(GET LIBRARY_HEADERS FILENAME folder)
+    list(APPEND LIBRARY_HEADERS "${generated_includes}/${folder}")
+  endif()
   foreach(target ${prefix}_objects ${name} ${prefix}_static)
     target_include_directories(${target}
-      PUBLIC $<BUILD_INTERFACE:${LIBRARY_INCLUDES}> $<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}>
+      PUBLIC "$<BUILD_INTERFACE:${include_folders}>" $<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}>
       PRIVATE "${LIBRARY_SOURCES}" ${LIBRARY_GENERATED})
     target_compile_features(${target} PUBLIC cxx_std_17)
     target_link_libraries(${target} PUBLIC ${LIBRARY_PUBLIC_LIBRARIES} PRIVATE ${LIBRARY_PRIVATE_LIBRARIES})
@@ -46,7 +55,7 @@ function(ssoclient_add_library name)
     set_target_properties(${name} PROPERTIES INSTALL_RPATH "$ORIGIN")
   endif()
 
-  ssoclient_install_package(NAME ${LIBRARY_PACKAGE} TARGET ${name} HEADERS "${LIBRARY_HEADERS}"
+  ssoclient_install_package(NAME ${LIBRARY_PACKAGE} TARGET ${name} HEADERS ${LIBRARY_HEADERS}
     DESCRIPTION "${LIBRARY_DESCRIPTION}" REQUIRES ${LIBRARY_REQUIRES} DEPENDENCIES ${LIBRARY_DEPENDENCIES})
 endfunction()
 

@@ -1,5 +1,6 @@
 #include <chrono>
 #include <cstddef>
+#include <cstring>
 #include <iostream>
 #include <string>
 
@@ -7,11 +8,17 @@
 #include <ssoclient/access/failure_kind.h>
 #include <ssoclient/access/token_gate.h>
 #include <ssoclient/access/token_source.h>
+#include <ssoclient/access/version.h>
 #include <ssoclient/ssoclient.h>
 
 namespace {
 
 using SsoClient::Access::FailureKind;
+
+bool HasTheVersionOfItsPackage() {
+  return std::strcmp(SSOCLIENT_ACCESS_VERSION, PACKAGE_VERSION) == 0 &&
+         std::strcmp(SsoClient::Access::Version(), PACKAGE_VERSION) == 0;
+}
 
 bool ClassifiesRefusedLogins() {
   const FailureKind kind =
@@ -108,6 +115,11 @@ bool RefusesATrustStoreWithoutFiles() {
 }  // namespace
 
 int main() {
+  if (!HasTheVersionOfItsPackage()) {
+    std::cerr << "The package has the version " << PACKAGE_VERSION << ", its library "
+              << SsoClient::Access::Version() << ".\n";
+    return 1;
+  }
   if (!ClassifiesRefusedLogins() || !ReportsCancellation() || !ReportsAnUnreachableEndpoint() ||
       !RefusesASourceWithoutEndpoints()) {
     std::cerr << "The installed library of token sources does not work as expected.\n";
