@@ -3,7 +3,7 @@
 
 #include <string>
 
-#include "output/console.h"
+#include "input/secret_text.h"
 
 namespace CLI {
 class App;
@@ -11,19 +11,24 @@ class App;
 
 namespace SsoClient::Tool {
 
-/// A password or a passphrase: from a file, a descriptor or the terminal, never from an argument.
+/// A password or a passphrase: from a file, a descriptor or the terminal, never from an argument or
+/// the environment, which other processes can see.
 class SecretOption {
  public:
   /// Adds --NAME-file and --NAME-fd, which exclude each other, to the command; `name` is
-  /// "password", for example.
+  /// "password", for example. The object must live as long as the command.
   void AddTo(CLI::App& command, const std::string& name);
 
   /// The secret: the first line of the file or the descriptor, or what the user types at the
-  /// terminal of the process without echo after `prompt`. Throws `ToolException` when there is
-  /// neither, when it is empty, when a file can be read by others, and when it cannot be read.
-  std::string Read(const Console& console, const std::string& prompt) const;
+  /// terminal of the process without echo after `prompt`. What is after the first line of a
+  /// descriptor stays there for others. Throws `ToolException` when there is neither (with the
+  /// status `kUsage`), when the secret is empty or longer than 1024 bytes, when a file can be read
+  /// by others, unless `mayBeOpen`, and when it cannot be read.
+  SecretText Read(const std::string& prompt, bool mayBeOpen) const;
 
  private:
+  SecretText ReadUnchecked(const std::string& prompt, bool mayBeOpen) const;
+
   std::string name_;
   std::string file_;
   int descriptor_ = -1;

@@ -13,6 +13,14 @@ class App;
 
 namespace SsoClient::Tool {
 
+/// The parts of a service's URL.
+struct ServiceAddress {
+  std::string host{};    ///< a name or an address, without brackets
+  std::string target{};  ///< path and query
+  int port = 0;
+  bool isHttps = false;
+};
+
 /// Where the service is, and how it is trusted. The options are the same in all commands.
 struct ConnectionOptions {
   std::string url{};                    ///< --url, or SSOCLIENT_URL
@@ -23,7 +31,9 @@ struct ConnectionOptions {
 
   /// Adds the options to the command. --url is required.
   void AddTo(CLI::App& command);
-  /// The TLS trust that the options describe.
+  /// The parts of the URL. Throws `ToolException` with the status `kUsage` for a malformed one.
+  ServiceAddress Address() const;
+  /// The TLS trust that the options describe. Throws `ToolException` when a file cannot be loaded.
   Tarnik::Ref<Tarnik::Ssl::SSLContext> MakeSslContext() const;
 };
 
