@@ -13,6 +13,7 @@ namespace SsoClient {
 /// Base of all exceptions that the library defines.
 class SSOCLIENT_EXPORT SsoException : public Tarnik::Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit SsoException(std::string message,
                         const boost::source_location& where = Tarnik::CurrentLocation())
       : Exception(std::move(message), where) {}
@@ -27,6 +28,7 @@ class SSOCLIENT_EXPORT SsoException : public Tarnik::Exception {
 /// HTTP status other than 2xx and 500.
 class SSOCLIENT_EXPORT CommunicationException : public SsoException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit CommunicationException(std::string message,
                                   const boost::source_location& where = Tarnik::CurrentLocation())
       : SsoException(std::move(message), where) {}
@@ -40,6 +42,7 @@ class SSOCLIENT_EXPORT CommunicationException : public SsoException {
 /// The service rejected the credentials.
 class SSOCLIENT_EXPORT InvalidCredentialsException : public SsoException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit InvalidCredentialsException(
       std::string message, const boost::source_location& where = Tarnik::CurrentLocation())
       : SsoException(std::move(message), where) {}
@@ -53,6 +56,7 @@ class SSOCLIENT_EXPORT InvalidCredentialsException : public SsoException {
 /// The user's password has expired.
 class SSOCLIENT_EXPORT PasswordExpiredException : public SsoException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit PasswordExpiredException(std::string message,
                                     const boost::source_location& where = Tarnik::CurrentLocation())
       : SsoException(std::move(message), where) {}
@@ -66,6 +70,7 @@ class SSOCLIENT_EXPORT PasswordExpiredException : public SsoException {
 /// Base of every failure to accept a token. Only its two subclasses are thrown.
 class SSOCLIENT_EXPORT InvalidTokenException : public SsoException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit InvalidTokenException(std::string message,
                                  const boost::source_location& where = Tarnik::CurrentLocation())
       : SsoException(std::move(message), where) {}
@@ -79,6 +84,7 @@ class SSOCLIENT_EXPORT InvalidTokenException : public SsoException {
 /// The token's XML does not have the accepted structure, or a validity rule fails.
 class SSOCLIENT_EXPORT ParseException : public InvalidTokenException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit ParseException(std::string message,
                           const boost::source_location& where = Tarnik::CurrentLocation())
       : InvalidTokenException(std::move(message), where) {}
@@ -92,6 +98,7 @@ class SSOCLIENT_EXPORT ParseException : public InvalidTokenException {
 /// The token's signature does not verify.
 class SSOCLIENT_EXPORT InvalidSignatureException : public InvalidTokenException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit InvalidSignatureException(
       std::string message, const boost::source_location& where = Tarnik::CurrentLocation())
       : InvalidTokenException(std::move(message), where) {}

@@ -22,8 +22,8 @@ namespace SsoClient {
 
 /// The subject's names from the claims "givenname" and "surname"; empty when the token has none.
 struct SubjectNames {
-  std::string givenName;
-  std::string surname;
+  std::string givenName;  ///< the given name
+  std::string surname;    ///< the family name
 };
 
 /// An accepted SAML 2.0 assertion, read-only. Owned only by the `std::shared_ptr` that the
@@ -103,10 +103,13 @@ using KeyInfoResolverSource =
 ///  - any other exception of `resolver`;
 ///  - `std::bad_alloc`.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml);
+/// The same with a tolerance, and without verification.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml,
                                                                   long clockToleranceSec);
+/// The same with verification.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(
     const std::string& xml, const Tarnik::Xml::Security::KeyInfoResolver* resolver);
+/// The same with verification and a tolerance.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(
     const std::string& xml, const Tarnik::Xml::Security::KeyInfoResolver* resolver,
     long clockToleranceSec);
@@ -123,10 +126,13 @@ SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlToken(
 /// namespace URI in scope).
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlTokenFromDom(
     Tarnik::Xml::ElementNode* assertion);
+/// The same with a tolerance, and without verification.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlTokenFromDom(
     Tarnik::Xml::ElementNode* assertion, long clockToleranceSec);
+/// The same with verification.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlTokenFromDom(
     Tarnik::Xml::ElementNode* assertion, const Tarnik::Xml::Security::KeyInfoResolver* resolver);
+/// The same with verification and a tolerance.
 SSOCLIENT_EXPORT std::shared_ptr<const SamlToken> CreateSamlTokenFromDom(
     Tarnik::Xml::ElementNode* assertion, const Tarnik::Xml::Security::KeyInfoResolver* resolver,
     long clockToleranceSec);

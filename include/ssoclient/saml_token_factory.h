@@ -16,11 +16,13 @@ class SamlTokenFactory {
   /// Does what the function `CreateSamlToken` does and throws what it throws. The default tolerance
   /// is 600 seconds.
   virtual std::shared_ptr<const SamlToken> CreateToken(const std::string& xml) const = 0;
+  /// The same with another tolerance in seconds.
   virtual std::shared_ptr<const SamlToken> CreateToken(const std::string& xml,
                                                        long clockToleranceSec) const = 0;
   /// The same for the function `CreateSamlTokenFromDom`.
   virtual std::shared_ptr<const SamlToken> CreateToken(
       Tarnik::Xml::ElementNode* assertion) const = 0;
+  /// The same with another tolerance in seconds.
   virtual std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode* assertion,
                                                        long clockToleranceSec) const = 0;
 

@@ -113,15 +113,21 @@ class SecurityTokenService {
   virtual std::shared_ptr<const SamlToken> RenewToken(const SamlToken& token,
                                                       std::int64_t lifetimeSec) const = 0;
 
+  /// `AcquireToken` on a worker thread.
   virtual void AcquireTokenAsync(const std::string& userName, const std::string& password,
                                  const TokenSpec& spec, TokenCallback callback) const = 0;
+  /// `AcquireTokenByGSS` on a worker thread, which calls the handler.
   virtual void AcquireTokenByGSSAsync(const TokenSpec& spec, NegotiationHandler& handler,
                                       TokenCallback callback) const = 0;
+  /// `AcquireTokenByCertificate` on a worker thread.
   virtual void AcquireTokenByCertificateAsync(const TokenSpec& spec,
                                               TokenCallback callback) const = 0;
+  /// `AcquireTokenByToken` on a worker thread.
   virtual void AcquireTokenByTokenAsync(const SamlToken& token, const TokenSpec& spec,
                                         TokenCallback callback) const = 0;
+  /// `ValidateSubject` on a worker thread.
   virtual void ValidateSubjectAsync(const SamlToken& token, ValidateCallback callback) const = 0;
+  /// `RenewToken` on a worker thread.
   virtual void RenewTokenAsync(const SamlToken& token, std::int64_t lifetimeSec,
                                TokenCallback callback) const = 0;
 

@@ -20,9 +20,11 @@ class TokenAwaitable {
  public:
   class Awaiter;
 
+  /// A call that begins when it is awaited. `source` must not be null.
   TokenAwaitable(std::shared_ptr<TokenSource> source, TokenSpec spec, CallContext context)
       : source_(std::move(source)), spec_(std::move(spec)), context_(std::move(context)) {}
 
+  /// Makes the awaiter, which takes over the arguments.
   Awaiter operator co_await() &&;
 
  private:
@@ -31,19 +33,25 @@ class TokenAwaitable {
   CallContext context_;
 };
 
+/// The awaiter of one call (C++20, section 7.6.2.3). The compiler calls its functions; they have
+/// the effects that `AwaitToken` describes.
 class TokenAwaitable::Awaiter {
  public:
+  /// Keeps the arguments of the call.
   Awaiter(std::shared_ptr<TokenSource> source, TokenSpec spec, CallContext context)
       : source_(std::move(source)), spec_(std::move(spec)), context_(std::move(context)) {}
   Awaiter(const Awaiter&) = delete;
   Awaiter& operator=(const Awaiter&) = delete;
 
+  /// True when the token comes from the cache, so that the coroutine need not suspend.
   bool await_ready() {
     if (MayTakeFromCache()) {
       token_ = source_->TryGetToken(spec_);
     }
     return token_ != nullptr;
   }
+  /// Begins the call, which resumes `caller` when it has ended. Throws what
+  /// `TokenSource::GetTokenAsync` throws.
   void await_suspend(std::coroutine_handle<> caller) {
     // The coroutine, and with it this object, may end before the call returns.
     const auto source = source_;
@@ -57,6 +65,7 @@ class TokenAwaitable::Awaiter {
                             caller.resume();
                           });
   }
+  /// Returns the token, or throws the exception of the call as its exact class.
   std::shared_ptr<const SamlToken> await_resume() {
     if (hasNoMemory_) {
       Tarnik::OutOfMemory().Throw();

@@ -18,7 +18,10 @@ class CancellationState;
 class SSOCLIENT_ACCESS_EXPORT CancellationRegistration {
  public:
   CancellationRegistration() noexcept = default;
+  /// Takes over the registration; `other` then has none.
   CancellationRegistration(CancellationRegistration&& other) noexcept;
+  /// Removes the function of this registration, as the destructor does, and takes over that of
+  /// `other`.
   CancellationRegistration& operator=(CancellationRegistration&& other) noexcept;
   ~CancellationRegistration();
 
@@ -36,6 +39,8 @@ class SSOCLIENT_ACCESS_EXPORT CancellationToken {
  public:
   CancellationToken() noexcept = default;
 
+  /// True after the first call of `CancellationSource::Cancel`. Always false for a
+  /// default-constructed token.
   bool IsCancelled() const noexcept;
   /// False for a default-constructed token.
   bool CanBeCancelled() const noexcept { return state_ != nullptr; }
@@ -59,6 +64,7 @@ class SSOCLIENT_ACCESS_EXPORT CancellationSource {
  public:
   CancellationSource();
 
+  /// The token to pass to calls, by `CallContext::cancellation`; any number of them may have it.
   CancellationToken Token() const noexcept { return token_; }
   /// Ends the calls under way with `Tarnik::CancelledException`, and those that are made later. The
   /// registered functions have run when the first call of `Cancel` returns. May be called any
@@ -72,6 +78,7 @@ class SSOCLIENT_ACCESS_EXPORT CancellationSource {
 /// How long one caller waits for one result. It applies to every stage of the call: waiting for
 /// another caller's request, for the next attempt, for the connection, and for the answer.
 struct CallContext {
+  /// The clock of deadlines. Changes of the system time do not affect it.
   using Clock = std::chrono::steady_clock;
 
   /// When the call ends at the latest, with a `CommunicationException` that says what it was

@@ -23,33 +23,35 @@ struct AttemptRecord {
   std::string source;    ///< `TokenSourceConfig::name`
   std::uint64_t id = 0;  ///< the same when it begins and when it ends; unique in the source
   std::string endpoint;  ///< the URL as configured; empty if no endpoint was chosen
-  AttemptOperation operation = AttemptOperation::kLogin;
+  AttemptOperation operation = AttemptOperation::kLogin;  ///< what it asks for
   bool isRefresh = false;  ///< begun in the background, for a key that has a usable token
   int number = 1;          ///< 1 for the first attempt of a request, 2 for the second
   /// The rest is set when the attempt has ended.
   std::chrono::microseconds duration{0};
-  FailureKind failure = FailureKind::kNone;
+  FailureKind failure = FailureKind::kNone;  ///< `kNone` if the attempt succeeded
   /// Of the failure, without control characters and without the password, and at most 1000 bytes
   /// long; empty without a failure.
   std::string message;
   int httpStatus = 0;  ///< of the last answer; 0 without an answer
 };
 
+/// Whether requests go to an endpoint: all of them, none until its next probe, or only the probe
+/// that is under way.
 enum class CircuitState { kClosed, kOpen, kHalfOpen };
 
 /// An endpoint's circuit has changed.
 struct CircuitRecord {
-  std::string source;
-  std::string endpoint;
-  CircuitState state = CircuitState::kClosed;
-  std::chrono::milliseconds retryAfter{0};  ///< for an open circuit, until the next probe
+  std::string source;                          ///< `TokenSourceConfig::name`
+  std::string endpoint;                        ///< the URL as configured
+  CircuitState state = CircuitState::kClosed;  ///< from now on
+  std::chrono::milliseconds retryAfter{0};     ///< for an open circuit, until the next probe
 };
 
 /// The `Date` of an endpoint's answers began, or ceased, to differ from this system's clock by more
 /// than 30 seconds. Only the answers of the service itself count: issued tokens and SOAP faults.
 struct ClockRecord {
-  std::string source;
-  std::string endpoint;
+  std::string source;                   ///< `TokenSourceConfig::name`
+  std::string endpoint;                 ///< the URL as configured
   std::chrono::milliseconds offset{0};  ///< the service's clock minus this system's
 };
 
@@ -63,8 +65,8 @@ struct ClockRecord {
 ///  - "confirmation": bearer or holder-of-key, and the key;
 ///  - "delegable" and "renewable".
 struct DeviationRecord {
-  std::string source;
-  std::string endpoint;
+  std::string source;     ///< `TokenSourceConfig::name`
+  std::string endpoint;   ///< the URL as configured
   std::string field;      ///< as listed above
   std::string requested;  ///< as text
   std::string issued;     ///< as text
@@ -73,9 +75,10 @@ struct DeviationRecord {
 /// A refresh has failed, and the last token is served until it is no longer usable; or the first
 /// request for a token of `TokenSourceConfig::keepFresh` has failed.
 struct RefreshFailureRecord {
-  std::string source;
+  std::string source;  ///< `TokenSourceConfig::name`
+  /// Of the last attempt.
   FailureKind failure = FailureKind::kNone;
-  std::string message;
+  std::string message;  ///< as in `AttemptRecord`
   /// None when there is no token.
   boost::optional<Tarnik::System::DateTime> usableUntil{};
   std::chrono::milliseconds nextAttempt{0};  ///< from now
@@ -93,11 +96,17 @@ struct RefreshFailureRecord {
 class SSOCLIENT_ACCESS_EXPORT AccessListener {
  public:
   virtual ~AccessListener();
+  /// An attempt begins; its duration, failure, message and status are not set.
   virtual void OnAttemptBegun(const AttemptRecord& attempt);
+  /// An attempt has ended. Called once for each call of `OnAttemptBegun`, with the same `id`.
   virtual void OnAttemptEnded(const AttemptRecord& attempt);
+  /// A refresh, or the first request for a token that is kept fresh, has failed.
   virtual void OnRefreshFailed(const RefreshFailureRecord& refresh);
+  /// The circuit of an endpoint has changed.
   virtual void OnCircuit(const CircuitRecord& circuit);
+  /// An endpoint's clock began, or ceased, to differ.
   virtual void OnClock(const ClockRecord& clock);
+  /// An issued token differs from the request. Called once for each field.
   virtual void OnDeviation(const DeviationRecord& deviation);
 };
 

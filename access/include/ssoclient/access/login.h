@@ -18,6 +18,7 @@ class TokenSource;
 /// (see `TokenSource`): if several sources have the same account, or several processes such as the
 /// children of a pre-forking server, each sends a wrong password once.
 struct PasswordLogin {
+  /// The name of the user, as `SecurityTokenService::AcquireToken` takes it.
   std::string userName{};
   /// Returns the password, which must not be empty; its text is cleansed from memory after use.
   /// Called on a worker thread before each login, so that a changed file or vault takes effect at
@@ -56,6 +57,7 @@ struct TokenLogin {
   TokenSpec spec{};
 };
 
+/// How a source logs in.
 using Login = std::variant<PasswordLogin, CertificateLogin, NegotiatedLogin, TokenLogin>;
 
 }  // namespace SsoClient::Access

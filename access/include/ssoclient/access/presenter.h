@@ -37,6 +37,7 @@ class SSOCLIENT_ACCESS_EXPORT Presenter {
   static Presenter WithSignature(std::string data, std::vector<unsigned char> signature,
                                  Tarnik::Crypto::SignatureAlgorithm algorithm);
 
+  /// How the sender has proved a key. `kNobody` also for a null certificate.
   Kind GetKind() const noexcept {
     return kind_ == Kind::kTlsCertificate && certificate_ == nullptr ? Kind::kNobody : kind_;
   }
@@ -46,7 +47,9 @@ class SSOCLIENT_ACCESS_EXPORT Presenter {
   }
   /// Of the kind `kSignature`; of others, empty or without meaning.
   const std::string& Data() const noexcept { return data_; }
+  /// The signature of the data; empty, or without meaning, for other kinds.
   const std::vector<unsigned char>& Signature() const noexcept { return signature_; }
+  /// The algorithm of the signature; without meaning for other kinds.
   Tarnik::Crypto::SignatureAlgorithm Algorithm() const noexcept { return algorithm_; }
 
  private:

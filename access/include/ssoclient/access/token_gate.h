@@ -35,6 +35,8 @@ struct GateCacheConfig {
   std::size_t bytes = std::size_t{64} * 1024 * 1024;
 };
 
+/// What a gate accepts. `CreateTokenGate` refuses a configuration that leaves open whom to trust,
+/// for whom tokens must be, or whether bearer tokens are accepted.
 struct GateConfig {
   /// Names the gate in the first line of `Verdict::ToString`; may be empty.
   std::string name{};
@@ -64,6 +66,7 @@ struct GateConfig {
   std::function<bool(const SamlToken& token, std::string& why)> predicate{};
   /// The longest text of a token in bytes; longer ones are refused before they are read. Positive.
   std::size_t largestToken = std::size_t{256} * 1024;
+  /// The size of the cache of accepted tokens.
   GateCacheConfig cache{};
   /// The current time; the system's clock if it is empty. For tests.
   std::function<Tarnik::System::DateTime()> clock{};
@@ -72,7 +75,7 @@ struct GateConfig {
 /// Counters since the gate was made, or since the fork in a child, and gauges. They are read one by
 /// one while others work.
 struct GateMetrics {
-  std::uint64_t accepted = 0;
+  std::uint64_t accepted = 0;  ///< checks that accepted the token
   /// By `Reason`, in the order of the enumeration, with an element for each; the first is zero.
   std::vector<std::uint64_t> refused{};
   std::uint64_t cacheHits = 0;    ///< checks of a remembered token, whatever their verdict
@@ -110,6 +113,7 @@ class SSOCLIENT_ACCESS_EXPORT TokenGate {
   /// use. Conditions of SAML that the accepted layout does not contain are refused as
   /// `Reason::kBadLayout`.
   virtual Verdict Check(const std::string& token, const Presenter& presenter) const = 0;
+  /// The counters of this gate. May be called at any time; does not wait for checks.
   virtual GateMetrics Metrics() const = 0;
 };
 

@@ -74,7 +74,7 @@ struct RetryConfig {
   /// for it. Callers that wait for less than an attempt of an endpoint takes to fail are not
   /// limited in this way.
   std::chrono::milliseconds firstDelay{500};
-  std::chrono::milliseconds longestDelay{std::chrono::minutes{1}};
+  std::chrono::milliseconds longestDelay{std::chrono::minutes{1}};  ///< the limit of these pauses
   /// A longer `Retry-After` of an endpoint counts as this. Until then it is left out, and others
   /// are asked.
   std::chrono::milliseconds longestRetryAfter{std::chrono::minutes{5}};
@@ -89,12 +89,14 @@ struct RetryConfig {
   std::chrono::seconds refusalMemory{std::chrono::minutes{5}};
 };
 
+/// The tokens that a source keeps.
 struct CacheConfig {
   /// The number of tokens kept; at least 1. The one that was not asked for the longest is evicted
   /// first. If tokens that are kept fresh fill the cache, it has room for one more.
   std::size_t capacity = 1000;
 };
 
+/// Where and how a source obtains tokens, and what it reports.
 struct TokenSourceConfig {
   /// Names the source in records and log lines; may be empty.
   std::string name{};
@@ -109,9 +111,13 @@ struct TokenSourceConfig {
   std::shared_ptr<SamlTokenFactory> tokenFactory{};
   /// The key that tokens are bound to. `CertificateLogin` and `TokenLogin` need it.
   boost::optional<HolderOfKeyConfig> holderOfKey{};
+  /// How the source logs in.
   Login login{};
+  /// When tokens are replaced.
   RefreshConfig refresh{};
+  /// How often and how fast requests are repeated.
   RetryConfig retry{};
+  /// How many tokens are kept.
   CacheConfig cache{};
   /// Tokens that the source requests when it is created and keeps fresh although nobody asks for
   /// them, so that the first call does not wait. Failures are reported to the listener. At most
@@ -133,8 +139,8 @@ struct TokenSourceMetrics {
   std::uint64_t logins = 0;             ///< successful
   std::uint64_t renewals = 0;           ///< successful
   std::uint64_t exchanges = 0;          ///< successful
-  std::uint64_t refreshFailures = 0;
-  std::uint64_t deviations = 0;
+  std::uint64_t refreshFailures = 0;    ///< reported by `AccessListener::OnRefreshFailed`
+  std::uint64_t deviations = 0;         ///< reported by `AccessListener::OnDeviation`
   /// Attempts by `FailureKind`, in the order of the enumeration; the first element is the number of
   /// those that succeeded.
   std::vector<std::uint64_t> attempts{};

@@ -34,6 +34,7 @@ struct TrustedIssuer {
   /// not trusted. Of the certificates that a token's KeyInfo may mean, the first 16 are tried; that
   /// matters only if it names none, so that it may mean all.
   std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>> certificates{};
+  /// Files with such certificates, and folders of such files.
   std::vector<std::string> certificatePaths{};
   /// Certificate revocation lists (RFC 5280, section 5). Without paths, revocation is not checked.
   /// With them, each of the certificates must be covered by a list of its issuer that is not out of
@@ -52,10 +53,10 @@ struct TrustedIssuer {
 
 /// A trusted certificate, as it is used now.
 struct TrustedSigner {
-  std::string issuer{};  ///< `TrustedIssuer::issuer`
-  Tarnik::Ref<const Tarnik::Crypto::Certificate> certificate{};
+  std::string issuer{};                                          ///< `TrustedIssuer::issuer`
+  Tarnik::Ref<const Tarnik::Crypto::Certificate> certificate{};  ///< of the key that may sign
   std::string path{};  ///< the file that contained it; empty if it was given as an object
-  bool isRevocationChecked = false;
+  bool isRevocationChecked = false;  ///< whether it must be covered by a list
   /// When it was revoked; none if it was not.
   boost::optional<Tarnik::System::DateTime> revokedSince{};
   /// When the list that covers it is out of date (nextUpdate); none without such a list.
@@ -64,6 +65,8 @@ struct TrustedSigner {
 
 /// The trust in use, and the last attempt to read it.
 struct TrustDescription {
+  /// The certificates in use, also those that are revoked; one that is trusted for two issuers is
+  /// in it twice.
   std::vector<TrustedSigner> signers{};
   /// `TrustedIssuer::issuer` of the entries of which no signer is above, since their folders
   /// contain no certificate; empty for any issuer. Their tokens are refused, unless there are
@@ -113,6 +116,7 @@ class SSOCLIENT_ACCESS_EXPORT TrustListener {
 /// level 2.
 SSOCLIENT_ACCESS_EXPORT std::shared_ptr<TrustListener> CreateTrustLogListener();
 
+/// The entries of a trust store, and how it follows its files.
 struct TrustStoreConfig {
   /// Names the store in records and log lines; may be empty.
   std::string name{};
@@ -146,6 +150,7 @@ class SSOCLIENT_ACCESS_EXPORT TrustStore {
   /// been called, unless it knows this failure already. Throws `Tarnik::InvalidStateException` in a
   /// function of the store's listener.
   virtual void Reload() = 0;
+  /// The trust in use now, and the result of the last attempt to read the files. Reads no file.
   virtual TrustDescription Describe() const = 0;
 };
 

@@ -30,6 +30,7 @@ enum class CheckKind {
   kPredicate,      ///< `GateConfig::predicate`
 };
 
+/// The result of a check. No check is reached after one that has failed.
 enum class CheckOutcome { kPassed, kFailed, kNotReached };
 
 /// Why a token was refused, for programs. Later versions may add some.
@@ -74,13 +75,15 @@ SSOCLIENT_ACCESS_EXPORT Remedy RemedyOf(Reason reason) noexcept;
 /// The names in lower case with hyphens, such as "signer-known" and "wrong-audience"; valid for the
 /// lifetime of the process.
 SSOCLIENT_ACCESS_EXPORT const char* NameOf(CheckKind check) noexcept;
+/// The same for outcomes, such as "not-reached".
 SSOCLIENT_ACCESS_EXPORT const char* NameOf(CheckOutcome outcome) noexcept;
+/// The same for reasons.
 SSOCLIENT_ACCESS_EXPORT const char* NameOf(Reason reason) noexcept;
 
 /// A line of the ledger.
 struct CheckRecord {
-  CheckKind check = CheckKind::kSize;
-  CheckOutcome outcome = CheckOutcome::kNotReached;
+  CheckKind check = CheckKind::kSize;                ///< which check
+  CheckOutcome outcome = CheckOutcome::kNotReached;  ///< its result
   /// What was compared with what, without control characters, and at most 1000 bytes long; empty
   /// when the check was not reached. Names people and certificates, but contains neither the text
   /// of the token nor a signature. Before the signature has been verified, it is what the token
@@ -95,6 +98,7 @@ struct VerdictFacts;
 /// be assigned to and destroyed.
 class SSOCLIENT_ACCESS_EXPORT Verdict {
  public:
+  /// True when every check has passed.
   bool IsAccepted() const noexcept;
   /// The accepted token; null when it was refused. Its `ExpirationTimeWithTolerance` has the
   /// tolerance of the gate (`GateConfig::clockTolerance`).
@@ -115,6 +119,7 @@ class SSOCLIENT_ACCESS_EXPORT Verdict {
   /// have passed, or none has been reached, and `compared` is empty. Throw
   /// `Tarnik::InvalidArgumentException` for null and for `Reason::kNone`.
   static Verdict Accept(std::shared_ptr<const SamlToken> token);
+  /// The same for a refusal.
   static Verdict Refuse(Reason reason, const std::string& message);
 
   /// For the library.

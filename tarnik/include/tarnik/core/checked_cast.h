@@ -15,6 +15,7 @@ T* CheckedCast(const Object* object) {
   throw TypeMismatchException("The object is not of the expected class.");
 }
 
+/// The same for an object that may be changed.
 template <class T>
 T* CheckedCast(Object* object) {
   if (auto* result = dynamic_cast<T*>(object)) {

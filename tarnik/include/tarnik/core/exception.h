@@ -12,6 +12,7 @@ namespace Tarnik {
 /// Base class of all failures that a caller may handle. Contains one message.
 class TARNIK_EXPORT Exception : public Throwable {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit Exception(std::string message, const boost::source_location& where = CurrentLocation());
   ~Exception() override;
   std::unique_ptr<Throwable> Clone() const override;
@@ -21,6 +22,7 @@ class TARNIK_EXPORT Exception : public Throwable {
 /// An argument that the called function does not accept.
 class TARNIK_EXPORT InvalidArgumentException : public Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit InvalidArgumentException(std::string message,
                                     const boost::source_location& where = CurrentLocation());
   ~InvalidArgumentException() override;
@@ -31,6 +33,7 @@ class TARNIK_EXPORT InvalidArgumentException : public Exception {
 /// An object that is not in the state that the called function requires.
 class TARNIK_EXPORT InvalidStateException : public Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit InvalidStateException(std::string message,
                                  const boost::source_location& where = CurrentLocation());
   ~InvalidStateException() override;
@@ -41,6 +44,7 @@ class TARNIK_EXPORT InvalidStateException : public Exception {
 /// An object that is not of the expected class.
 class TARNIK_EXPORT TypeMismatchException : public Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit TypeMismatchException(std::string message,
                                  const boost::source_location& where = CurrentLocation());
   ~TypeMismatchException() override;
@@ -51,6 +55,7 @@ class TARNIK_EXPORT TypeMismatchException : public Exception {
 /// Text that is not a date and time.
 class TARNIK_EXPORT DateTimeFormatException : public Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit DateTimeFormatException(std::string message,
                                    const boost::source_location& where = CurrentLocation());
   ~DateTimeFormatException() override;
@@ -61,6 +66,7 @@ class TARNIK_EXPORT DateTimeFormatException : public Exception {
 /// Text that is not Base64.
 class TARNIK_EXPORT Base64FormatException : public Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit Base64FormatException(std::string message,
                                  const boost::source_location& where = CurrentLocation());
   ~Base64FormatException() override;
@@ -71,6 +77,7 @@ class TARNIK_EXPORT Base64FormatException : public Exception {
 /// An input or output operation that failed: file, socket or stream.
 class TARNIK_EXPORT IOException : public Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit IOException(std::string message,
                        const boost::source_location& where = CurrentLocation());
   ~IOException() override;
@@ -81,6 +88,7 @@ class TARNIK_EXPORT IOException : public Exception {
 /// An operation that did not end within its time limit.
 class TARNIK_EXPORT TimeoutException : public IOException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit TimeoutException(std::string message,
                             const boost::source_location& where = CurrentLocation());
   ~TimeoutException() override;
@@ -91,6 +99,7 @@ class TARNIK_EXPORT TimeoutException : public IOException {
 /// An operation that was cancelled before it ended.
 class TARNIK_EXPORT CancelledException : public IOException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit CancelledException(std::string message,
                               const boost::source_location& where = CurrentLocation());
   ~CancelledException() override;
@@ -101,6 +110,7 @@ class TARNIK_EXPORT CancelledException : public IOException {
 /// The system has too few threads, descriptors or bytes of memory.
 class TARNIK_EXPORT ResourceException : public Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit ResourceException(std::string message,
                              const boost::source_location& where = CurrentLocation());
   ~ResourceException() override;

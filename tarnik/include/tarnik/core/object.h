@@ -37,9 +37,11 @@ class TARNIK_EXPORT Object {
   virtual void OnLastRef() const noexcept {}
 };
 
+/// For `Ref`: adds a reference.
 inline void intrusive_ptr_add_ref(const Object* object) noexcept {
   object->IncRef();
 }
+/// For `Ref`: removes a reference.
 inline void intrusive_ptr_release(const Object* object) noexcept {
   object->DecRef();
 }

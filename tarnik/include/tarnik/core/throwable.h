@@ -22,7 +22,9 @@ constexpr boost::source_location CurrentLocation(const char* file = __builtin_FI
 /// the binary interface: destructors, `what`, `Message`, `Dump`, `Where`, `Clone`, `Throw`.
 class TARNIK_EXPORT Throwable : public std::exception {
  public:
+  /// Copies share the message: copying does not allocate and cannot fail.
   Throwable(const Throwable&) = default;
+  /// As the copy constructor.
   Throwable& operator=(const Throwable&) = default;
   ~Throwable() override;
 
@@ -41,6 +43,7 @@ class TARNIK_EXPORT Throwable : public std::exception {
   [[noreturn]] virtual void Throw() const = 0;
 
  protected:
+  /// For derived classes: an exception with this message, which was created at `where`.
   Throwable(std::string message, const boost::source_location& where);
 
  private:

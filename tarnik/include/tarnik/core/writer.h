@@ -26,6 +26,7 @@ class TARNIK_EXPORT StringWriter : public Writer {
   virtual std::string TakeText() = 0;
 };
 
+/// An empty writer.
 TARNIK_EXPORT Ref<StringWriter> CreateStringWriter();
 
 }  // namespace Tarnik

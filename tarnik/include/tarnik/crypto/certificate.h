@@ -18,13 +18,17 @@ class TARNIK_EXPORT Certificate : public virtual Object {
  public:
   /// The DER encoding and its length in bytes; valid as long as the certificate.
   virtual const unsigned char* DerBytes() const noexcept = 0;
+  /// The number of these bytes.
   virtual std::size_t DerLength() const noexcept = 0;
   /// Distinguished names in the form of RFC 2253 (most specific part first).
   virtual const std::string& SubjectName() const = 0;
+  /// The name of the issuer in the same form.
   virtual const std::string& IssuerName() const = 0;
   /// The serial number in decimal.
   virtual const std::string& SerialNumber() const = 0;
+  /// The beginning of its validity (RFC 5280, section 4.1.2.5), in UTC.
   virtual System::DateTime NotBefore() const = 0;
+  /// The last moment of its validity, in UTC.
   virtual System::DateTime NotAfter() const = 0;
   /// The SubjectKeyIdentifier extension; empty when it is absent.
   virtual const std::vector<unsigned char>& SubjectKeyIdentifier() const = 0;

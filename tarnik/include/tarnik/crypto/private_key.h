@@ -61,9 +61,9 @@ TARNIK_EXPORT Ref<const PrivateKey> LoadPrivateKeyFromUri(
 /// A private key, the certificate that was issued for it, and the other certificates of the same
 /// source in their order: usually the certificate's issuers.
 struct KeyAndCertificate {
-  Ref<const PrivateKey> privateKey;
-  Ref<const Certificate> certificate;
-  std::vector<Ref<const Certificate>> chain;
+  Ref<const PrivateKey> privateKey;           ///< never null
+  Ref<const Certificate> certificate;         ///< never null
+  std::vector<Ref<const Certificate>> chain;  ///< may be empty
 };
 
 /// Reads a PKCS#12 (RFC 7292) with a MAC. It must contain one private key and that key's

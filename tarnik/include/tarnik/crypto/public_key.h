@@ -6,12 +6,14 @@
 
 namespace Tarnik::Crypto {
 
+/// The kind of a key: RSA, RSA restricted to PSS (RFC 4055), elliptic curve, or any other.
 enum class KeyAlgorithm { kRsa, kRsaPss, kEc, kOther };
 
 /// A public key. Immutable; thread-safe. Returned by `Certificate::GetPublicKey` and
 /// `PrivateKey::GetPublicKey`.
 class TARNIK_EXPORT PublicKey : public virtual Object {
  public:
+  /// The kind of this key.
   virtual KeyAlgorithm Algorithm() const noexcept = 0;
   /// The size in bits of the modulus (RSA) or of the order (EC).
   virtual int Bits() const noexcept = 0;

@@ -25,6 +25,7 @@ class TARNIK_EXPORT RevocationList : public virtual Object {
   virtual const std::string& IssuerName() const = 0;
   /// When the list was issued, and by when the next one will be.
   virtual System::DateTime ThisUpdate() const = 0;
+  /// By when the next list is issued.
   virtual System::DateTime NextUpdate() const = 0;
   /// True when `issuer` made the list and was allowed to: its subject is the list's issuer (RFC
   /// 5280, section 7.1), its keyUsage, if there is one, includes cRLSign, the list's authority key

@@ -24,6 +24,7 @@ enum class ExchangeStage {
 /// earlier. Thread-safe.
 class TARNIK_EXPORT CallLimit : public virtual Object {
  public:
+  /// The clock of deadlines. Changes of the system time do not affect it.
   using Clock = std::chrono::steady_clock;
 
   /// When the exchanges under this limit end at the latest, to the millisecond.

@@ -18,6 +18,7 @@ class TARNIK_EXPORT ConnectionSpec : public virtual Object {};
 /// the binary interface.
 class TARNIK_EXPORT CustomConnectionSpec : public ConnectionSpec {
  public:
+  /// Receives the stream and null, or the exception; see `StartConnect`.
   using ConnectCompletion = std::function<void(System::Stream*, Exception*)>;
 
   /// The host of the service for the Host header.

@@ -11,6 +11,7 @@ namespace Tarnik::Http {
 /// An HTTP exchange that violated the protocol or a limit.
 class TARNIK_EXPORT HttpException : public IOException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit HttpException(std::string message,
                          const boost::source_location& where = CurrentLocation());
   ~HttpException() override;
@@ -22,6 +23,7 @@ class TARNIK_EXPORT HttpException : public IOException {
 /// (RFC 9112, section 8).
 class TARNIK_EXPORT CutOffException : public HttpException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit CutOffException(std::string message,
                            const boost::source_location& where = CurrentLocation());
   ~CutOffException() override;

@@ -8,6 +8,7 @@
 
 namespace Tarnik::Http {
 
+/// The methods that requests may have (RFC 9110, section 9.3).
 enum class Method { GET, POST };
 
 /// A request that is sent once. Used by one thread at a time until it is sent. Its body is cleansed

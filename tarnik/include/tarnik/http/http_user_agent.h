@@ -14,8 +14,9 @@
 
 namespace Tarnik::Http {
 
-/// Limits of an answer.
+/// The longest status line and headers of an answer, with those of its interim answers, in bytes.
 inline constexpr std::size_t kMaxHeaderBytes = std::size_t{64} * 1024;
+/// The longest body of an answer, in bytes.
 inline constexpr std::size_t kMaxBodyBytes = std::size_t{16} * 1024 * 1024;
 
 /// An exchange under way. `Cancel` closes its connection, and the completion then receives a
@@ -28,6 +29,7 @@ class TARNIK_EXPORT PendingRequestItem : public System::CancellableItem {};
 /// connections when it is destroyed. Thread-safe.
 class TARNIK_EXPORT ConnectionPool : public virtual Object {};
 
+/// An empty pool.
 TARNIK_EXPORT Ref<ConnectionPool> CreateConnectionPool();
 
 /// Sends HTTP/1.1 requests (RFC 9112) to one endpoint. Thread-safe. Each exchange under way has a
@@ -41,6 +43,7 @@ TARNIK_EXPORT Ref<ConnectionPool> CreateConnectionPool();
 /// reported unchanged.
 class TARNIK_EXPORT UserAgent : public virtual Object {
  public:
+  /// Receives an exception or an answer, and the item that `SendAsync` has returned.
   using Completion = std::function<void(Exception*, ClientResponse*, PendingRequestItem*)>;
 
   /// Sends `request` and returns immediately. The completion runs exactly once, on an I/O thread,

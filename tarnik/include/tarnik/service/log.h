@@ -22,8 +22,11 @@ class TARNIK_EXPORT StaticLogger {
   /// `name` must live as long as the process (a literal).
   explicit StaticLogger(const char* name);
 
+  /// The name that it was created with.
   const char* Name() const noexcept { return name_; }
+  /// The level now, 0 to 9.
   int Level() const noexcept;
+  /// Whether a line of this level is written now.
   bool IsEnabled(int level) const noexcept { return Level() >= level; }
 
  private:
@@ -47,9 +50,9 @@ TARNIK_EXPORT void SetLogLevel(std::string_view name, int level);
 
 /// One line on its way to the sink. The views are valid only during the call.
 struct LogRecord {
-  std::string_view logger;
-  int level;
-  std::string_view text;
+  std::string_view logger;  ///< the name of the logger
+  int level;                ///< 1 to 9
+  std::string_view text;    ///< one line, without a line feed at its end
 };
 
 /// Receives every line that its logger's level allows. It is called on the thread that logs, so

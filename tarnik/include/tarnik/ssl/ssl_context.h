@@ -19,6 +19,7 @@ namespace Tarnik::Ssl {
 /// a forked child cannot use the stream of its parent, as `Stream` says.
 class TARNIK_EXPORT SSLStream : public System::Stream {
  public:
+  /// Receives null, or why the handshake failed.
   using HandshakeCompletion = std::function<void(Exception* error)>;
 
   /// Runs the client's side of the handshake. The peer must present a certificate that the context
@@ -62,6 +63,7 @@ struct SSLContextConfig {
   /// are set or neither. A key in a device can be used only if its provider does not export the
   /// public half to another provider, since OpenSSL would then try to sign with that provider.
   Ref<const Crypto::Certificate> clientCertificate;
+  /// The key of `clientCertificate`.
   Ref<const Crypto::PrivateKey> clientPrivateKey;
   /// Sent after `clientCertificate`: its issuers, each after the certificate that it issued.
   std::vector<Ref<const Crypto::Certificate>> clientCertificateChain;

@@ -12,6 +12,7 @@ namespace Tarnik::Ssl {
 /// and, for a connection, the peer.
 class TARNIK_EXPORT SSLException : public IOException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit SSLException(std::string message,
                         const boost::source_location& where = CurrentLocation());
   ~SSLException() override;
@@ -24,6 +25,7 @@ class TARNIK_EXPORT SSLException : public IOException {
 /// be determined, or the peer has none (RFC 5280, section 6).
 class TARNIK_EXPORT PeerTrustException : public SSLException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit PeerTrustException(std::string message,
                               const boost::source_location& where = CurrentLocation());
   ~PeerTrustException() override;
@@ -35,6 +37,7 @@ class TARNIK_EXPORT PeerTrustException : public SSLException {
 /// section 6). It may be unacceptable for other reasons, too.
 class TARNIK_EXPORT PeerNameException : public SSLException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit PeerNameException(std::string message,
                              const boost::source_location& where = CurrentLocation());
   ~PeerNameException() override;
@@ -46,6 +49,7 @@ class TARNIK_EXPORT PeerNameException : public SSLException {
 /// be cut off (RFC 8446, section 6.1).
 class TARNIK_EXPORT TruncationException : public SSLException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit TruncationException(std::string message,
                                const boost::source_location& where = CurrentLocation());
   ~TruncationException() override;

@@ -44,6 +44,7 @@ class TARNIK_EXPORT DateTime {
     int millisecond;    ///< 0 to 999
     int microsecond;    ///< 0 to 999, within the millisecond
   };
+  /// The fields of this value.
   Fields GetFields() const noexcept;
 
   /// "2024-03-05T07:08:09.010Z"; microseconds are added when they are not zero
@@ -53,15 +54,21 @@ class TARNIK_EXPORT DateTime {
   /// The zone designator: "Z" for UTC, else "+hh:mm" or "-hh:mm".
   std::string ToShortStringBias() const;
 
+  /// Values are compared as instants: the zones of their fields do not matter.
   friend bool operator==(const DateTime& a, const DateTime& b) noexcept {
     return a.utcMicroseconds_ == b.utcMicroseconds_;
   }
+  /// Different instants.
   friend bool operator!=(const DateTime& a, const DateTime& b) noexcept { return !(a == b); }
+  /// True when `a` is before `b`.
   friend bool operator<(const DateTime& a, const DateTime& b) noexcept {
     return a.utcMicroseconds_ < b.utcMicroseconds_;
   }
+  /// True when `a` is after `b`.
   friend bool operator>(const DateTime& a, const DateTime& b) noexcept { return b < a; }
+  /// True unless `a` is after `b`.
   friend bool operator<=(const DateTime& a, const DateTime& b) noexcept { return !(b < a); }
+  /// True unless `a` is before `b`.
   friend bool operator>=(const DateTime& a, const DateTime& b) noexcept { return !(a < b); }
 
  private:
@@ -79,8 +86,9 @@ TARNIK_EXPORT DateTime DateTimeFromUtc(long utcMicroseconds, bool inLocalZone);
 /// The current time of the system clock, with its fields in UTC.
 TARNIK_EXPORT DateTime GetUtcDateTime();
 
-/// `a + b` and `a * b`, limited to the 64-bit range instead of overflowing.
+/// The sum, limited to the 64-bit range instead of overflowing.
 TARNIK_EXPORT long SaturatingAdd(long a, long b) noexcept;
+/// The product, limited in the same way.
 TARNIK_EXPORT long SaturatingMultiply(long a, long b) noexcept;
 
 }  // namespace Tarnik::System

@@ -25,7 +25,9 @@ namespace Tarnik::System {
 /// nothing, and the other functions throw `InvalidStateException`.
 class TARNIK_EXPORT Stream : public virtual Object {
  public:
+  /// Receives the number of bytes read, and null or the exception.
   using ReadCompletion = std::function<void(std::size_t bytesRead, Exception* error)>;
+  /// Receives null when all bytes were written, or the exception.
   using WriteCompletion = std::function<void(Exception* error)>;
 
   /// Reads at least one and at most `size` bytes. Zero bytes without an error mean the orderly

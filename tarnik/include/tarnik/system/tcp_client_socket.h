@@ -15,6 +15,7 @@ namespace Tarnik::System {
 /// A TCP connection that is opened by this side.
 class TARNIK_EXPORT TCPClientSocket : public Stream {
  public:
+  /// Receives this socket, and null or the exception.
   using ConnectCompletion = std::function<void(TCPClientSocket*, Exception*)>;
 
   /// Resolves `host` (a name or a literal IPv4 or IPv6 address, without brackets) and connects to

@@ -28,6 +28,7 @@ namespace Tarnik::System {
 /// call `exec` or `_exit`.
 class TARNIK_EXPORT ThreadPool : public virtual Object {
  public:
+  /// The largest number of worker threads.
   static constexpr int kMaxWorkers = 256;
 
   /// Runs `item` on a worker thread. An exception that leaves the item, also `std::bad_alloc`, ends

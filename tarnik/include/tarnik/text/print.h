@@ -18,11 +18,17 @@ namespace Tarnik {
 /// date-times in their `DateTime::ToString` form, and texts unchanged.
 class TARNIK_EXPORT PrintFormatter {
  public:
+  /// A text.
   PrintFormatter(std::string text) : text_(std::move(text)) {}
+  /// A text, which is copied.
   PrintFormatter(std::string_view text) : text_(text) {}
+  /// A text that ends in a NUL, which is copied. Not null.
   PrintFormatter(const char* text) : text_(text) {}
+  /// A date-time.
   PrintFormatter(const System::DateTime& time) : text_(time.ToString()) {}
+  /// A pointer.
   PrintFormatter(const void* pointer);
+  /// An integer or a boolean.
   template <class Integer, std::enable_if_t<std::is_integral_v<Integer>, int> = 0>
   PrintFormatter(Integer value) {
     if constexpr (std::is_same_v<Integer, bool>) {
@@ -32,6 +38,7 @@ class TARNIK_EXPORT PrintFormatter {
     }
   }
 
+  /// The text of the value.
   const std::string& Text() const noexcept { return text_; }
 
  private:
@@ -41,6 +48,7 @@ class TARNIK_EXPORT PrintFormatter {
 /// A date-time in a readable form: "2024-03-05 07:08:09.010 UTC", milliseconds always shown.
 class TARNIK_EXPORT DatePrintFormatter : public PrintFormatter {
  public:
+  /// Formats `time`.
   explicit DatePrintFormatter(const System::DateTime& time);
 };
 

@@ -10,6 +10,7 @@ namespace Tarnik::Xml {
 /// Character data. Adjacent pieces and CDATA sections of a parsed document form one text node.
 class TARNIK_EXPORT TextNode final : public Node {
  public:
+  /// The characters, unescaped, in UTF-8.
   std::string_view Text() const noexcept { return {text_, length_}; }
   /// True when the text contains a CDATA section, possibly an empty one, in the parsed document.
   bool HasCDataSection() const noexcept { return hasCDataSection_ != 0; }
@@ -25,8 +26,10 @@ class TARNIK_EXPORT TextNode final : public Node {
   std::size_t length_ = 0;
 };
 
+/// A comment. Found only in parsed documents.
 class TARNIK_EXPORT CommentNode final : public Node {
  public:
+  /// The characters between "<!--" and "-->".
   std::string_view Text() const noexcept { return {text_, length_}; }
 
  private:
@@ -37,9 +40,12 @@ class TARNIK_EXPORT CommentNode final : public Node {
   std::size_t length_ = 0;
 };
 
+/// A processing instruction. Found only in parsed documents.
 class TARNIK_EXPORT ProcessingInstructionNode final : public Node {
  public:
+  /// The name after "<?".
   std::string_view Target() const noexcept { return {target_, targetLength_}; }
+  /// What follows the target and white space, up to "?>".
   std::string_view Text() const noexcept { return {text_, length_}; }
 
  private:

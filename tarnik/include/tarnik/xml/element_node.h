@@ -15,11 +15,15 @@ struct InternedName;
 class QualifiedName {
  public:
   QualifiedName() = default;
+  /// The name `full`, whose first `prefixLength` bytes are the prefix. Keeps a view, not a copy.
   QualifiedName(std::string_view full, std::size_t prefixLength) noexcept
       : full_(full), prefixLength_(prefixLength) {}
 
+  /// The name as written.
   std::string_view Full() const noexcept { return full_; }
+  /// What precedes the colon; empty without one.
   std::string_view Prefix() const noexcept { return full_.substr(0, prefixLength_); }
+  /// What follows the colon; without one, the whole name.
   std::string_view Local() const noexcept {
     return prefixLength_ == 0 ? full_ : full_.substr(prefixLength_ + 1);
   }
@@ -32,8 +36,11 @@ class QualifiedName {
 /// An attribute. Namespace declarations are attributes named "xmlns" or "xmlns:p".
 class TARNIK_EXPORT Attribute {
  public:
+  /// The qualified name as written.
   std::string_view Name() const noexcept { return Qualified().Full(); }
+  /// The qualified name with its parts.
   QualifiedName Qualified() const noexcept;
+  /// The value, normalised and unescaped, in UTF-8.
   std::string_view Value() const noexcept { return {value_, valueLength_}; }
   /// True for "xmlns" and "xmlns:p".
   bool IsNamespaceDeclaration() const noexcept;
@@ -52,7 +59,9 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
  public:
   /// The name as written, with its prefix.
   std::string_view QualifiedNameText() const noexcept;
+  /// The prefix as written; empty without one.
   std::string_view Prefix() const noexcept;
+  /// The name without its prefix.
   std::string_view LocalName() const noexcept;
   /// The namespace bound to the element's prefix here; empty when the prefix is not bound.
   std::string_view NamespaceUri() const noexcept;
@@ -68,6 +77,7 @@ class TARNIK_EXPORT ElementNode final : public ParentNode {
   /// deep the tree is.
   ElementNode* NextElement(const ElementNode* top) const noexcept;
 
+  /// The number of attributes, namespace declarations included.
   std::size_t AttributeCount() const noexcept;
   /// Attribute `index`, from 0.
   const Attribute& AttributeAt(std::size_t index) const noexcept;

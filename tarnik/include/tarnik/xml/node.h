@@ -14,6 +14,8 @@ class ElementNode;
 class ParentNode;
 class Tree;
 
+/// What a node is. The kind decides its class: `ElementNode`, `TextNode`, `CommentNode`,
+/// `ProcessingInstructionNode` or `Document`.
 enum class NodeKind : unsigned char {
   kElement,
   kText,
@@ -37,6 +39,7 @@ class TARNIK_EXPORT Node : public Object {
   /// The kind and, for elements, the name; never content.
   std::string ToString() const override;
 
+  /// What this node is.
   NodeKind Kind() const noexcept { return kind_; }
   /// The element or document that contains this node, or null.
   ParentNode* Parent() const noexcept { return parent_; }
@@ -44,12 +47,14 @@ class TARNIK_EXPORT Node : public Object {
   ElementNode* ParentElement() const noexcept;
   /// The next child of the same parent, or null.
   Node* NextSibling() const noexcept;
-  /// Position in the source document, counted from 1 (columns in bytes); 0 for nodes that were not
-  /// parsed.
+  /// The line of its beginning in the source document, counted from 1 (columns in bytes); 0 for
+  /// nodes that were not parsed.
   int Line() const noexcept { return static_cast<int>(line_); }
+  /// The column of the same position.
   int Column() const noexcept { return static_cast<int>(column_); }
 
  protected:
+  /// For the library: a node of this tree.
   Node(Tree& tree, NodeKind kind) noexcept
       : tree_(&tree), column_(0), hasCDataSection_(0), kind_(kind) {}
   ~Node() override = default;
@@ -73,8 +78,9 @@ class TARNIK_EXPORT Node : public Object {
 /// A node that has children: an element or a document.
 class TARNIK_EXPORT ParentNode : public Node {
  public:
-  /// The first and last child, or null.
+  /// The first child, or null.
   Node* FirstChild() const noexcept;
+  /// The last child, or null.
   Node* LastChild() const noexcept { return last_; }
   /// The first child element with this local name in any namespace, or null.
   ElementNode* FirstChildElement(std::string_view localName) const noexcept;

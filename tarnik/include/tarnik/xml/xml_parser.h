@@ -12,25 +12,30 @@ namespace Tarnik::Xml {
 
 /// Position in a document, counted from 1 (columns in bytes).
 struct Position {
-  unsigned long line;
-  unsigned long column;
+  unsigned long line;    ///< from 1
+  unsigned long column;  ///< from 1
 };
 
+/// An attribute as it was read. Namespace declarations are attributes, too.
 struct ParsedAttribute {
-  std::string_view name;
-  std::string_view value;
+  std::string_view name;   ///< the qualified name
+  std::string_view value;  ///< normalised and unescaped
 };
 
 /// Receives the content of a document in document order. Views are valid only during the call. Used
 /// by one parser, once. An exception passes through the parser unchanged.
 class TARNIK_EXPORT XMLHandler : public virtual Object {
  public:
+  /// The start of an element with `count` attributes, in the order in which they are written.
   virtual void StartElement(const Position& position, std::string_view name,
                             const ParsedAttribute* attributes, std::size_t count) = 0;
+  /// The end of the element that was started last and has not ended.
   virtual void EndElement(const Position& position) = 0;
   /// Character data; one text may be reported in several calls.
   virtual void Characters(const Position& position, std::string_view text) = 0;
+  /// A comment: the characters between "<!--" and "-->".
   virtual void Comment(const Position& position, std::string_view text) = 0;
+  /// A processing instruction: the name after "<?", and what follows it.
   virtual void ProcessingInstruction(const Position& position, std::string_view target,
                                      std::string_view text) = 0;
   /// The end of a well-formed document; returns the handler's result.
@@ -50,8 +55,9 @@ TARNIK_EXPORT Ref<XMLHandler> CreateXMLDocumentHandler();
 /// document and all elements around it may have together.
 inline constexpr std::size_t kMaxOpenAttributes = 1024;
 
-/// Limits of parsed documents.
+/// The largest number of elements that contain one another.
 inline constexpr std::size_t kMaxElementDepth = 256;
+/// The longest document, in bytes.
 inline constexpr std::size_t kMaxDocumentBytes = std::size_t{16} * 1024 * 1024;
 
 /// Reads one XML 1.0 document from a reader. Names consist of the characters of XML 1.0, fourth
@@ -67,6 +73,7 @@ class TARNIK_EXPORT XMLParser : public virtual Object {
   virtual Ref<Object> Parse() = 0;
 };
 
+/// A parser that reads from `reader` and reports to `handler`, both of which it keeps alive.
 TARNIK_EXPORT Ref<XMLParser> CreateXMLParser(Reader* reader, XMLHandler* handler);
 
 }  // namespace Tarnik::Xml

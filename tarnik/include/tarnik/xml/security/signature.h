@@ -43,9 +43,10 @@ class TARNIK_EXPORT SignatureReference : public virtual Object {
 /// tree; a blank one is used by one thread at a time.
 class TARNIK_EXPORT Signature : public virtual Object {
  public:
-  /// The algorithms' URIs, as written. These and the results of the next accessors are valid as
+  /// The URI of the algorithm, as written. This and the results of the next accessors are valid as
   /// long as the signature.
   virtual const std::string& CanonicalizationMethod() const = 0;
+  /// The algorithm of the signature value.
   virtual const std::string& SignatureMethod() const = 0;
   /// In the order of SignedInfo.
   virtual const std::vector<Reference>& References() const = 0;

@@ -11,6 +11,7 @@ namespace Tarnik::Xml::Security {
 /// A signature, key or algorithm that cannot be processed.
 class TARNIK_EXPORT XmlSecurityException : public Exception {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit XmlSecurityException(std::string message,
                                 const boost::source_location& where = CurrentLocation());
   ~XmlSecurityException() override;
@@ -21,6 +22,7 @@ class TARNIK_EXPORT XmlSecurityException : public Exception {
 /// A Signature element that violates the structure of XML Signature.
 class TARNIK_EXPORT SignatureSyntaxException : public XmlSecurityException {
  public:
+  /// An exception with this message, which says that it was created at `where`.
   explicit SignatureSyntaxException(std::string message,
                                     const boost::source_location& where = CurrentLocation());
   ~SignatureSyntaxException() override;
