@@ -1,6 +1,7 @@
-// Certificates, private keys and PKCS#12 from the input are loaded, or refused with a
-// `CryptoException`. What is loaded equals what OpenSSL's own readers return, and what is refused
-// without a rule of ours they refuse too. The first byte of the input is the kind of the others.
+// Certificates, private keys, PKCS#12 and revocation lists from the input are loaded, or refused
+// with a `CryptoException`. What is loaded equals what OpenSSL's own readers return, and what is
+// refused without a rule of ours they refuse too; for revocation lists see list_model.h. The first
+// byte of the input is the kind of the others.
 #include <algorithm>
 #include <cstdlib>
 #include <optional>
@@ -15,15 +16,21 @@
 #include <tarnik/crypto/certificate.h>
 #include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/crypto/private_key.h>
+#include <tarnik/crypto/revocation_list.h>
 
+#include "certificate_values.h"
 #include "crypto/private_key_impl.h"
 #include "fixed_random.h"
 #include "input.h"
+#include "list_model.h"
 #include "support/openssl.h"
 
 namespace {
 
 using namespace Tarnik;
+using Fuzz::BytesOf;
+using Fuzz::SecondsOf;
+using Fuzz::TextOf;
 
 constexpr char kPassphrase[] = "secret";
 constexpr long kMaxIterations = 2048;
@@ -37,10 +44,6 @@ std::string DerOf(const X509* certificate) {
 
 std::string DerOf(const Crypto::Certificate& certificate) {
   return {reinterpret_cast<const char*>(certificate.DerBytes()), certificate.DerLength()};
-}
-
-const unsigned char* BytesOf(std::string_view text) {
-  return reinterpret_cast<const unsigned char*>(text.data());
 }
 
 OpenSsl::OwnedBio Memory(std::string_view text) {
@@ -157,24 +160,6 @@ std::optional<std::vector<Block>> BlocksOf(std::string_view text) {
 
 // Certificates.
 
-std::string TextOf(const X509_NAME* name) {
-  const OpenSsl::OwnedBio memory(BIO_new(BIO_s_mem()));
-  // Characters outside ASCII are not escaped.
-  X509_NAME_print_ex(memory.get(), name, 0,
-                     XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB));
-  char* text = nullptr;
-  const long length = BIO_get_mem_data(memory.get(), &text);
-  return {text, static_cast<std::size_t>(length)};
-}
-
-long SecondsOf(const ASN1_TIME* time) {
-  const OpenSsl::Owned<ASN1_TIME, ASN1_TIME_free> epoch(ASN1_TIME_set(nullptr, 0));
-  int days = 0;
-  int seconds = 0;
-  Fuzz::Require(ASN1_TIME_diff(&days, &seconds, epoch.get(), time) == 1);
-  return days * 86'400L + seconds;
-}
-
 void Compare(const Crypto::Certificate& ours, std::string_view bytes) {
   const unsigned char* position = BytesOf(bytes);
   const OpenSsl::OwnedCertificate theirs(
@@ -218,6 +203,40 @@ void LoadDer(std::string_view bytes) {
   try {
     Compare(*Crypto::CreateCertificateFromDer(BytesOf(bytes), bytes.size()), bytes);
   } catch (const Crypto::CryptoException&) {
+  }
+}
+
+// Revocation lists.
+
+void LoadLists(std::string_view text) {
+  std::vector<Ref<const Crypto::RevocationList>> ours;
+  try {
+    ours = Crypto::CreateRevocationListsFromPem(text);
+  } catch (const Crypto::CryptoException&) {
+  }
+  auto blocks = BlocksOf(text);
+  if (blocks) {
+    std::erase_if(*blocks, [](const Block& block) { return block.label != PEM_STRING_X509_CRL; });
+  }
+  const bool areUsable = blocks && !blocks->empty() &&
+                         std::all_of(blocks->begin(), blocks->end(), [](const Block& block) {
+                           return Fuzz::ReadUsableList(block.bytes) != nullptr;
+                         });
+  Fuzz::Require(ours.size() == (areUsable ? blocks->size() : 0));
+  for (std::size_t i = 0; i < ours.size(); ++i) {
+    Fuzz::CompareList(*ours[i], (*blocks)[i].bytes);
+  }
+}
+
+void LoadList(std::string_view bytes) {
+  Ref<const Crypto::RevocationList> ours;
+  try {
+    ours = Crypto::CreateRevocationListFromDer(BytesOf(bytes), bytes.size());
+  } catch (const Crypto::CryptoException&) {
+  }
+  Fuzz::Require((ours != nullptr) == (Fuzz::ReadUsableList(bytes) != nullptr));
+  if (ours != nullptr) {
+    Fuzz::CompareList(*ours, bytes);
   }
 }
 
@@ -373,6 +392,15 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
       break;
     case 'm':
       LoadPkcs12(content, true);
+      break;
+    case 'r':
+      LoadLists(content);
+      break;
+    case 'l':
+      LoadList(content);
+      break;
+    case 's':
+      LoadList(Fuzz::SignedList(content));
       break;
     default:
       break;

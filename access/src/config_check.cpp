@@ -5,23 +5,17 @@
 #include <variant>
 #include <vector>
 
-#include <tarnik/core/exception.h>
 #include <tarnik/http/http_url.h>
 #include <tarnik/xml/character_nodes.h>
 
 #include "instant.h"
+#include "require.h"
 
 namespace SsoClient::Access {
 
 namespace {
 
 constexpr std::chrono::milliseconds kLongestAttempt = std::chrono::seconds(240);
-
-void Require(bool condition, const char* message) {
-  if (!condition) {
-    throw Tarnik::InvalidArgumentException(message);
-  }
-}
 
 struct LoginCheck {
   const TokenSourceConfig& config;

@@ -11,15 +11,10 @@
 
 namespace SsoClient::Access {
 
-struct TokenSourceImpl::Process {
-  std::uint64_t generation;
-  std::shared_ptr<Core> core;
-  std::future<void> end;  // ready when nothing of the core is left that belongs to the user
-};
-
 namespace {
 
 constexpr std::chrono::seconds kEndLimit{1};
+constexpr std::chrono::milliseconds kNoWait{0};
 
 // The core releases its configuration last.
 std::future<void> WatchEnd(std::shared_ptr<const TokenSourceConfig>& config) {
@@ -49,16 +44,37 @@ Core::Parts MakeSystemParts(const std::shared_ptr<const TokenSourceConfig>& conf
 
 }  // namespace
 
+/// The core of one process.
+struct TokenSourceImpl::Process {
+  Process(Core::Parts parts, bool isStopped)
+      : end(WatchEnd(parts.config)), core(MakeCore(std::move(parts))) {
+    if (isStopped) {
+      core->Stop(kNoWait);
+    }
+  }
+  ~Process() {
+    if (core != nullptr) {
+      core->Stop(kNoWait);
+    }
+  }
+  Process(const Process&) = delete;
+  Process& operator=(const Process&) = delete;
+
+  std::future<void> end;  // ready when nothing of the core is left that belongs to the user
+  std::shared_ptr<Core> core;
+};
+
 TokenSource::~TokenSource() = default;
 
-TokenSourceImpl::TokenSourceImpl(MakeParts makeParts)
-    : makeParts_(std::move(makeParts)), process_(MakeProcess()) {}
+TokenSourceImpl::TokenSourceImpl(MakeParts makeParts) : makeParts_(std::move(makeParts)) {
+  Current();
+}
 
 TokenSourceImpl::~TokenSourceImpl() {
-  if (process_.load(std::memory_order_acquire)->generation != ForkGeneration()) {
+  Process* const process = process_.Find();
+  if (process == nullptr) {
     return;
   }
-  const std::unique_ptr<Process> process(process_.load(std::memory_order_acquire));
   const bool isIdle = process->core->Stop(kEndLimit) && !process->core->IsRunningHere() &&
                       !Tarnik::System::IsProcessEnding();
   process->core.reset();
@@ -69,26 +85,9 @@ TokenSourceImpl::~TokenSourceImpl() {
   }
 }
 
-TokenSourceImpl::Process* TokenSourceImpl::MakeProcess() const {
-  Core::Parts parts = makeParts_();
-  std::future<void> end = WatchEnd(parts.config);
-  return new Process{ForkGeneration(), MakeCore(std::move(parts)), std::move(end)};
-}
-
 Core& TokenSourceImpl::Current() const {
-  Process* known = process_.load(std::memory_order_acquire);
-  if (known->generation == ForkGeneration()) {
-    return *known->core;
-  }
-  std::unique_ptr<Process> made(MakeProcess());
-  if (isStopped_) {
-    made->core->Stop(std::chrono::milliseconds(0));
-  }
-  if (process_.compare_exchange_strong(known, made.get(), std::memory_order_acq_rel)) {
-    return *made.release()->core;
-  }
-  made->core->Stop(std::chrono::milliseconds(0));
-  return *known->core;
+  Process& process = process_.Get([this] { return Process(makeParts_(), isStopped_); });
+  return *process.core;
 }
 
 std::shared_ptr<const SamlToken> TokenSourceImpl::GetToken(const TokenSpec& spec,

@@ -8,6 +8,7 @@
 #include <ssoclient/access/token_source.h>
 
 #include "core.h"
+#include "per_process.h"
 
 namespace SsoClient::Access {
 
@@ -39,12 +40,11 @@ class TokenSourceImpl final : public TokenSource {
   struct Process;
 
   Core& Current() const;
-  Process* MakeProcess() const;
 
   const MakeParts makeParts_;
-  mutable std::atomic<Process*> process_;
   // In a child, the source is stopped if it was stopped in the parent before.
   std::atomic<bool> isStopped_{false};
+  PerProcess<Process> process_;
 };
 
 }  // namespace SsoClient::Access

@@ -2,8 +2,7 @@
 
 #include <algorithm>
 
-#include <tarnik/core/exception.h>
-
+#include "require.h"
 #include "trust/trust_store_impl.h"
 
 namespace SsoClient::Access {
@@ -13,12 +12,6 @@ namespace {
 constexpr std::chrono::seconds kNoTime{0};
 constexpr std::chrono::hours kThousandYears{24 * 365 * 1000};
 
-void RequireOfGate(bool condition, const char* message) {
-  if (!condition) {
-    throw Tarnik::InvalidArgumentException(message);
-  }
-}
-
 bool IsSaid(BearerTokens bearerTokens) noexcept {
   return bearerTokens == BearerTokens::kRefuse || bearerTokens == BearerTokens::kAccept;
 }
@@ -26,24 +19,23 @@ bool IsSaid(BearerTokens bearerTokens) noexcept {
 }  // namespace
 
 void CheckGateConfig(const GateConfig& config) {
-  RequireOfGate(config.trust != nullptr, "The trust store of the gate (trust) is null.");
-  RequireOfGate(dynamic_cast<const TrustStoreImpl*>(config.trust.get()) != nullptr,
-                "The trust store of the gate (trust) was not created by CreateTrustStore.");
-  RequireOfGate(!config.audiences.empty(), "The gate has no audience (audiences).");
-  RequireOfGate(std::none_of(config.audiences.begin(), config.audiences.end(),
-                             [](const std::string& audience) { return audience.empty(); }),
-                "An audience of the gate (audiences) is empty.");
-  RequireOfGate(IsSaid(config.bearerTokens),
-                "It is not said whether the gate accepts bearer tokens (bearerTokens).");
-  RequireOfGate(config.clockTolerance >= kNoTime,
-                "The clock tolerance of the gate (clockTolerance) is negative.");
-  RequireOfGate(config.longestLifetime > kNoTime,
-                "The longest lifetime of the gate's tokens (longestLifetime) is not positive.");
-  RequireOfGate(std::none_of(config.allowedGroups.begin(), config.allowedGroups.end(),
-                             [](const PrincipalId& group) { return group.name.empty(); }),
-                "The name of an allowed group of the gate (allowedGroups) is empty.");
-  RequireOfGate(config.largestToken > 0,
-                "The size of the gate's largest token (largestToken) is 0.");
+  Require(config.trust != nullptr, "The trust store of the gate (trust) is null.");
+  Require(dynamic_cast<const TrustStoreImpl*>(config.trust.get()) != nullptr,
+          "The trust store of the gate (trust) was not created by CreateTrustStore.");
+  Require(!config.audiences.empty(), "The gate has no audience (audiences).");
+  Require(std::none_of(config.audiences.begin(), config.audiences.end(),
+                       [](const std::string& audience) { return audience.empty(); }),
+          "An audience of the gate (audiences) is empty.");
+  Require(IsSaid(config.bearerTokens),
+          "It is not said whether the gate accepts bearer tokens (bearerTokens).");
+  Require(config.clockTolerance >= kNoTime,
+          "The clock tolerance of the gate (clockTolerance) is negative.");
+  Require(config.longestLifetime > kNoTime,
+          "The longest lifetime of the gate's tokens (longestLifetime) is not positive.");
+  Require(std::none_of(config.allowedGroups.begin(), config.allowedGroups.end(),
+                       [](const PrincipalId& group) { return group.name.empty(); }),
+          "The name of an allowed group of the gate (allowedGroups) is empty.");
+  Require(config.largestToken > 0, "The size of the gate's largest token (largestToken) is 0.");
 }
 
 void LimitGateDurations(GateConfig& config) noexcept {

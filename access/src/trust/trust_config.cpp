@@ -10,6 +10,7 @@
 #include <tarnik/core/exception.h>
 #include <tarnik/text/display_text.h>
 
+#include "require.h"
 #include "trust/trust_text.h"
 
 namespace SsoClient::Access {
@@ -17,12 +18,6 @@ namespace SsoClient::Access {
 namespace {
 
 constexpr std::size_t kLongestPath = 200;
-
-void RequireTrust(bool condition, const std::string& message) {
-  if (!condition) {
-    throw Tarnik::InvalidArgumentException(message);
-  }
-}
 
 // "entry issuers[1] ('https://b') of the trust store"
 std::string EntryText(const TrustedIssuer& entry, std::size_t index) {
@@ -35,31 +30,31 @@ void CheckPaths(const std::vector<std::string>& paths, const char* member,
                 const std::string& entry) {
   for (std::size_t i = 0; i < paths.size(); ++i) {
     const std::string name = std::string(member) + "[" + std::to_string(i) + "] of the " + entry;
-    RequireTrust(!paths[i].empty(), "The path " + name + " is empty.");
-    RequireTrust(paths[i].find('\0') == std::string::npos,
-                 "The path " + name + " contains a NUL: '" +
-                     Tarnik::ToDisplayText(paths[i], kLongestPath) + "'.");
+    Require(!paths[i].empty(), "The path " + name + " is empty.");
+    Require(paths[i].find('\0') == std::string::npos,
+            "The path " + name + " contains a NUL: '" +
+                Tarnik::ToDisplayText(paths[i], kLongestPath) + "'.");
   }
 }
 
 // An entry without an issuer is for any: that has to be said, since it may have been forgotten.
 void CheckName(const TrustedIssuer& entry, const std::string& name) {
-  RequireTrust(entry.isForAnyIssuer || !entry.issuer.empty(),
-               "The " + name + " names no issuer and is not for any issuer.");
-  RequireTrust(!entry.isForAnyIssuer || entry.issuer.empty(),
-               "The " + name + " names an issuer and is for any issuer.");
+  Require(entry.isForAnyIssuer || !entry.issuer.empty(),
+          "The " + name + " names no issuer and is not for any issuer.");
+  Require(!entry.isForAnyIssuer || entry.issuer.empty(),
+          "The " + name + " names an issuer and is for any issuer.");
 }
 
 void CheckEntry(const TrustedIssuer& entry, const std::string& name) {
   CheckName(entry, name);
-  RequireTrust(!entry.certificates.empty() || !entry.certificatePaths.empty(),
-               "The " + name + " has neither a certificate nor a path of one.");
+  Require(!entry.certificates.empty() || !entry.certificatePaths.empty(),
+          "The " + name + " has neither a certificate nor a path of one.");
   const auto null = std::find(entry.certificates.begin(), entry.certificates.end(), nullptr);
-  RequireTrust(null == entry.certificates.end(),
-               "The certificate certificates[" + std::to_string(null - entry.certificates.begin()) +
-                   "] of the " + name + " is null.");
-  RequireTrust(entry.listSignerPaths.empty() || !entry.revocationListPaths.empty(),
-               "The " + name + " has signers of revocation lists, but no path of a list.");
+  Require(null == entry.certificates.end(), "The certificate certificates[" +
+                                                std::to_string(null - entry.certificates.begin()) +
+                                                "] of the " + name + " is null.");
+  Require(entry.listSignerPaths.empty() || !entry.revocationListPaths.empty(),
+          "The " + name + " has signers of revocation lists, but no path of a list.");
   CheckPaths(entry.certificatePaths, "certificatePaths", name);
   CheckPaths(entry.revocationListPaths, "revocationListPaths", name);
   CheckPaths(entry.listSignerPaths, "listSignerPaths", name);
@@ -80,7 +75,7 @@ void MakeAbsolute(std::vector<std::string>& paths) {
 }  // namespace
 
 void CheckTrustConfig(const TrustStoreConfig& config) {
-  RequireTrust(!config.issuers.empty(), "The trust store has no entry.");
+  Require(!config.issuers.empty(), "The trust store has no entry.");
   for (std::size_t i = 0; i < config.issuers.size(); ++i) {
     CheckEntry(config.issuers[i], EntryText(config.issuers[i], i));
   }

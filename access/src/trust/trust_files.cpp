@@ -271,7 +271,11 @@ TrustContents ReadFiles(const TrustListing& listing) {
 }
 
 TrustContents ReadUnchanged(const std::vector<TrustedIssuer>& issuers, TrustListing& listing) {
-  listing = ListFiles(issuers);
+  return ReadUnchanged([&issuers] { return ListFiles(issuers); }, listing);
+}
+
+TrustContents ReadUnchanged(const std::function<TrustListing()>& list, TrustListing& listing) {
+  listing = list();
   for (int reading = 0; reading < kReadings; ++reading) {
     TrustContents contents;
     std::unique_ptr<Tarnik::Throwable> failure;
@@ -280,7 +284,7 @@ TrustContents ReadUnchanged(const std::vector<TrustedIssuer>& issuers, TrustList
     } catch (const Tarnik::IOException& error) {
       failure = error.Clone();
     }
-    TrustListing after = ListFiles(issuers);
+    TrustListing after = list();
     // A folder may have been replaced by another one and put back in between.
     if (after == listing && (failure != nullptr || contents.isOfListing)) {
       if (failure != nullptr) {

@@ -2,6 +2,7 @@
 #define SSOCLIENT_ACCESS_TRUST_TRUST_FILES_H
 
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -86,6 +87,9 @@ TrustContents ReadFiles(const TrustListing& listing);
 ///
 /// Throws as above, and `Tarnik::IOException` when the files do not stay the same for long enough.
 TrustContents ReadUnchanged(const std::vector<TrustedIssuer>& issuers, TrustListing& listing);
+
+/// The same for the files that are listed by `list`.
+TrustContents ReadUnchanged(const std::function<TrustListing()>& list, TrustListing& listing);
 
 }  // namespace SsoClient::Access
 

@@ -8,6 +8,7 @@
 
 #include <tarnik/crypto/crypto_exception.h>
 
+#include "support/test_revocation_lists.h"
 #include "trust/trust_fixture.h"
 
 namespace SsoClient::Access::Testing {
@@ -29,6 +30,18 @@ class TrustEntryTest : public TrustFixture {
   const Signer& First() {
     snapshot = store->Current();
     return snapshot->Find(kIssuer)->signers.at(0);
+  }
+
+  // A list of `TrustCa`, in DER.
+  static std::string ListRevokingSince(const char* time) {
+    Tarnik::Testing::RevocationListRecipe recipe;
+    recipe.key = TrustCa().key.get();
+    recipe.entries = {{Sts(0).ToCertificate()->SerialNumber(), time}};
+    recipe.edit = [](X509_CRL* list) {
+      X509_CRL_set_issuer_name(list, X509_get_subject_name(TrustCa().certificate.get()));
+    };
+    const auto der = Tarnik::Testing::MakeRevocationListDer(recipe);
+    return {der.begin(), der.end()};
   }
 
   static constexpr const char* kForeignList =
@@ -163,6 +176,12 @@ TEST_F(TrustEntryTest, LatestListCounts) {
   Put("lists/b.crl", MakeCrl(TrustCa(), nullptr, 3600, -50));
   Wait();
   EXPECT_FALSE(First().revokedSince);
+  const auto until = First().listUntil;
+  Put("lists/c.crl", MakeCrl(TrustCa(), &Sts(0), 900, -150));
+  Wait();
+  EXPECT_EQ(Failure(), "");
+  EXPECT_FALSE(First().revokedSince);
+  EXPECT_EQ(First().listUntil->GetUtcTime(), until->GetUtcTime());
 }
 
 // The new key's later lists need not contain what was issued by the old one.
@@ -191,6 +210,40 @@ TEST_F(TrustEntryTest, ListsOfOneDateAllCount) {
     Make();
     EXPECT_TRUE(First().revokedSince);
     EXPECT_EQ(First().listUntil->GetUtcTime(), (now + 500) * 1'000'000);
+  }
+}
+
+// Of one date, so that neither is later.
+TEST_F(TrustEntryTest, EarliestRevocationInListsOfOneDateCounts) {
+  for (const bool isEarlierFirst : {true, false}) {
+    const std::string earlier = ListRevokingSince("20240101000000Z");
+    const std::string later = ListRevokingSince("20240301000000Z");
+    Put("lists/a.crl", isEarlierFirst ? earlier : later);
+    Put("lists/b.crl", isEarlierFirst ? later : earlier);
+    Make();
+    EXPECT_EQ(First().revokedSince->ToString(), "2024-01-01T00:00:00.000Z");
+  }
+}
+
+TEST_F(TrustEntryTest, ListsOfOneDateByTwoKeysOfTheAuthorityAllCount) {
+  config.issuers[0].listSignerPaths.push_back(Put("new-ca.pem", StrangeCa().Pem()));
+  const std::time_t now = std::time(nullptr);
+  for (const long end : {500, 900}) {
+    Put("lists/a.crl", MakeCrl(TrustCa(), nullptr, end, -100, now));
+    Put("lists/b.crl", MakeCrl(StrangeCa(), nullptr, 1400 - end, -100, now));
+    Make();
+    EXPECT_EQ(First().listUntil->GetUtcTime(), (now + 500) * 1'000'000);
+  }
+}
+
+TEST_F(TrustEntryTest, EarliestRevocationByAKeyOfTheAuthorityCounts) {
+  config.issuers[0].listSignerPaths.push_back(Put("new-ca.pem", StrangeCa().Pem()));
+  const std::time_t now = std::time(nullptr);
+  for (const long begin : {-100, -200}) {
+    Put("lists/a.crl", MakeCrl(TrustCa(), &Sts(0), 900, begin, now));
+    Put("lists/b.crl", MakeCrl(StrangeCa(), &Sts(0), 900, -300 - begin, now));
+    Make();
+    EXPECT_EQ(First().revokedSince->GetUtcTime(), (now - 200) * 1'000'000);
   }
 }
 

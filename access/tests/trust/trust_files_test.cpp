@@ -33,6 +33,19 @@ class TrustFilesTest : public TrustFixture {
 
   TrustContents Read() const { return ReadFiles(ListFiles(config.issuers)); }
 
+  // Reads while files change: `change` is called before the listing with its number, from 0.
+  template <class Change>
+  TrustContents ReadWhile(const Change& change) {
+    int listings = 0;
+    TrustListing listing;
+    return ReadUnchanged(
+        [&] {
+          change(listings++);
+          return ListFiles(config.issuers);
+        },
+        listing);
+  }
+
   std::string Refusal() const {
     return WithoutRoot(MessageOf<IOException>([this] { Read(); }));
   }
@@ -117,6 +130,15 @@ TEST_F(TrustFilesTest, WhatTheListingSaysIsRefusedBeforeAFileIsRead) {
             "The trust file '/missing' cannot be read: No such file or directory.");
 }
 
+TEST_F(TrustFilesTest, WhatIsListedAsNoFileIsRefusedBeforeAFileIsRead) {
+  Put("trust/a.pem", "a");
+  std::filesystem::create_directory(PathOf("trust/b.pem"));
+  const TrustListing listing = ListFiles(config.issuers);
+  Remove("trust/a.pem");
+  EXPECT_EQ(WithoutRoot(MessageOf<IOException>([&] { ReadFiles(listing); })),
+            "The trust file '/trust/b.pem' cannot be read: it is not a regular file.");
+}
+
 // As when a link leads elsewhere while files are read, and back before they are listed again.
 TEST_F(TrustFilesTest, FileThatIsNotTheListedOneIsNoticed) {
   for (const std::string folder : {"first", "second"}) {
@@ -131,6 +153,42 @@ TEST_F(TrustFilesTest, FileThatIsNotTheListedOneIsNoticed) {
   Rename("next", "link");
   EXPECT_FALSE(ReadFiles(listing).isOfListing);
   EXPECT_TRUE(Read().isOfListing);
+}
+
+TEST_F(TrustFilesTest, FilesThatChangeWhileTheyAreReadAreReadAgain) {
+  Put("trust/a.pem", "a");
+  const TrustContents contents = ReadWhile([this](int listing) {
+    if (listing == 1) {
+      Put("trust/b.pem", "b");
+    }
+  });
+  EXPECT_EQ(Paths(contents.entries[0].certificates), (Names{"/trust/a.pem", "/trust/b.pem"}));
+}
+
+TEST_F(TrustFilesTest, FileThatIsGoneWhenItIsReadIsNoErrorIfItIsNoLongerListed) {
+  Put("trust/a.pem", "a");
+  Put("trust/b.pem", "b");
+  TrustListing listing;
+  const TrustContents contents = ReadUnchanged(
+      [this] {
+        TrustListing listed = ListFiles(config.issuers);
+        std::filesystem::remove(PathOf("trust/a.pem"));
+        return listed;
+      },
+      listing);
+  EXPECT_EQ(Paths(contents.entries[0].certificates), Names{"/trust/b.pem"});
+}
+
+TEST_F(TrustFilesTest, FilesThatNeverStayTheSameAreAnError) {
+  int last = 0;
+  EXPECT_EQ(MessageOf<IOException>([&] {
+              ReadWhile([&](int listing) {
+                last = listing;
+                Put("trust/a.pem", std::string(static_cast<std::size_t>(listing), 'a'));
+              });
+            }),
+            "The trust files change faster than they can be read.");
+  EXPECT_EQ(last, 5);
 }
 
 TEST_F(TrustFilesTest, TooFewDescriptorsAreAShortage) {

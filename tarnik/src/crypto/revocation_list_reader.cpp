@@ -181,7 +181,8 @@ RevokedSerials RevokedIn(X509_CRL* list) {
 RevocationListContent ReadRevocationList(const std::vector<unsigned char>& der) {
   const OpenSsl::OwnedCrl owner = DecodeList(der);
   X509_CRL* const list = owner.get();
-  if (X509_CRL_get_version(list) > X509_CRL_VERSION_2) {
+  const long version = X509_CRL_get_version(list);
+  if (version != X509_CRL_VERSION_1 && version != X509_CRL_VERSION_2) {
     throw CryptoException("The revocation list has an unknown version.");
   }
   CheckListExtensions(X509_CRL_get0_extensions(list));

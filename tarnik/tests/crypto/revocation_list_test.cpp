@@ -155,6 +155,16 @@ TEST(RevocationListErrorTest, NoNextUpdate) {
             "The revocation list's nextUpdate is before its thisUpdate.");
 }
 
+// RFC 5280, section 5.1.2.1.
+TEST(RevocationListErrorTest, UnknownVersion) {
+  for (const long version : {-256L, -5L, -1L, 0L, 1L, 2L, 256L}) {
+    const bool isKnown = version == X509_CRL_VERSION_1 || version == X509_CRL_VERSION_2;
+    EXPECT_EQ(ErrorOf({.edit = [&](X509_CRL* raw) { X509_CRL_set_version(raw, version); }}),
+              isKnown ? "accepted" : "The revocation list has an unknown version.")
+        << version;
+  }
+}
+
 TEST(RevocationListErrorTest, DeltaList) {
   for (const bool isCritical : {true, false}) {
     EXPECT_EQ(ErrorWithExtension(isCritical, "2.5.29.27", "\x02\x01\x01"),
