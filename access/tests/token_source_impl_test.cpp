@@ -104,6 +104,33 @@ TEST_F(TokenSourceImplTest, SourceThatWasStoppedIsStoppedInTheChild) {
             0);
 }
 
+// While a thread of the child makes a core, another thread makes the one that is used.
+TEST_F(TokenSourceImplTest, OneOfTwoCoresThatThreadsOfAChildMakeIsUsed) {
+  config.keepFresh = {spec};
+  const auto shared = std::make_shared<const TokenSourceConfig>(config);
+  bool isFirst = false;
+  source = std::make_shared<TokenSourceImpl>([&] {
+    if (std::exchange(isFirst, false)) {
+      source->Metrics();
+    }
+    Core::Parts parts{shared, runtime, {}};
+    for (std::size_t i = 0; i < shared->endpoints.size(); ++i) {
+      parts.clients.push_back(std::make_unique<ScriptedEndpoint>(shared->endpoints[i], scripts[i]));
+    }
+    return parts;
+  });
+  runtime->Settle();
+  const std::size_t before = Attempts();
+  EXPECT_EQ(before, 1U);
+  EXPECT_EQ(InChild([&] {
+              isFirst = true;
+              source->Metrics();
+              runtime->Settle();
+              return static_cast<int>(Attempts() - before);
+            }),
+            1);
+}
+
 TEST_F(TokenSourceImplTest, DestructionStopsTheSource) {
   Make();
   std::thread destroying;
