@@ -214,11 +214,12 @@ class PageWriter:
         if entity.kind in ("function", "friend"):
             text += element.findtext("argsstring") or ""
         else:
-            text += " " + (element.findtext("initializer") or "").strip()
+            initializer = element.find("initializer")
+            value = "" if initializer is None else "".join(initializer.itertext()).strip()
+            text += value if value.startswith("{") else f" {value}"
         text = re.sub(r"\s+", " ", text.strip()).replace("=0", "= 0").replace("=default", "= default")
-        for prefix in ("explicit",):
-            if element.get(prefix) == "yes" and not text.startswith(prefix):
-                text = f"{prefix} {text}"
+        if element.get("explicit") == "yes" and not text.startswith("explicit"):
+            text = f"explicit {text}"
         template = element.find("templateparamlist")
         if template is not None:
             names = ", ".join(" ".join("".join(p.itertext()).split()) for p in template)
@@ -265,7 +266,7 @@ class PageWriter:
         return parts
 
     def entity(self, entity, previous):
-        """A namespace's name; overloads that follow one another have one heading."""
+        """What a namespace declares; overloads that follow one another have one heading."""
         self.scope = entity.qualified if entity.kind in ("class", "struct") else entity.scope
         parts = []
         if previous is None or (previous.name, previous.kind) != (entity.name, "function"):
@@ -273,14 +274,12 @@ class PageWriter:
         else:
             parts.append(f'<div class="anchor" id="{html.escape(entity.anchor)}"></div>')
         parts += self.block(entity)
-        fields, before = [], None
-        for member in entity.members:
-            if member.kind == "variable":
-                fields.append(member)
+        fields = [member for member in entity.members if member.kind == "variable"]
         if fields:
             parts.append(self.fields(fields))
+        before = None
         for member in entity.members:
-            if member.kind == "variable":
+            if member in fields:
                 continue
             if before is None or before.name != member.name:
                 parts.append(self.heading(3, member, self.title(member)))
@@ -328,7 +327,8 @@ def index_page(reference):
             for entity in reference.entities[path]:
                 if entity.name not in seen:
                     seen.add(entity.name)
-                    names.append(f'<a href="{url}#{html.escape(entity.anchor)}"><code>{html.escape(entity.name)}</code></a>')
+                    target = f"{url}#{html.escape(entity.anchor)}"
+                    names.append(f'<a href="{target}"><code>{html.escape(entity.name)}</code></a>')
             writer.scope = reference.entities[path][0].scope
             about = first_sentence(writer.description(reference.entities[path][0].element))
             rows.append(f'<dt><a href="{url}">{path[len(folder):]}</a></dt><dd><p>{about}</p>'

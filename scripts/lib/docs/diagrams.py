@@ -45,8 +45,9 @@ def drawing(width, height, parts, description):
     arrow = ('<defs><marker id="arrow" viewBox="0 0 10 10" refX="9" refY="5" markerWidth="8" markerHeight="8" '
              'orient="auto-start-reverse"><path class="tip" d="M0,0.5 L10,5 L0,9.5 z"/></marker></defs>')
     style = f"max-width:{width:.0f}px;min-width:{width * 0.7:.0f}px"
-    return (f'<figure class="diagram" tabindex="0" aria-label="Diagram"><svg role="img" aria-label="{escape(description)}" '
-            f'viewBox="0 0 {width:.0f} {height:.0f}" style="{style}">{arrow}{"".join(parts)}</svg></figure>')
+    return (f'<figure class="diagram" tabindex="0" aria-label="Diagram"><svg role="img" '
+            f'aria-label="{escape(description)}" viewBox="0 0 {width:.0f} {height:.0f}" style="{style}">'
+            f'{arrow}{"".join(parts)}</svg></figure>')
 
 
 # Flowcharts
@@ -136,7 +137,7 @@ MESSAGE = re.compile(r"^(\w+)(--?>>)(\w+): (.+)$")
 
 
 def read_sequence(lines):
-    """The names of the participants by their identifiers, and the events: messages, and beginnings and ends of loops."""
+    """The names of the participants by their identifiers, and the events: messages, and the ends of loops."""
     names, events = {}, []
     for line in lines:
         if match := re.fullmatch(r"participant (\w+)(?: as (.+))?", line):

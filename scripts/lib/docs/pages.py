@@ -3,7 +3,8 @@
 
 Writes WORK/pages, WORK/theme and WORK/mkdocs.yml. The pages are the Markdown files of the repository; a link in them
 may lead to any file or folder of the repository, and what is no page becomes one that shows the file. Diagrams are
-drawn, and the marks <!-- figures: NAME --> are replaced by what figures.py makes of them. WORK/api/xml has Doxygen's output.
+drawn, and the marks <!-- figures: NAME --> are replaced by what figures.py makes of them. WORK/api/xml has the output
+of Doxygen.
 """
 import os
 import re
