@@ -314,8 +314,7 @@ def first_sentence(blocks):
 def index_page(reference):
     """The contents: each header of each library, with what it declares."""
     parts = ["# API reference",
-             "Each page is one installed header. Names in `SsoClient::InternalApi` and `Tarnik::Detail` are for the "
-             "libraries themselves."]
+             "Each page is one installed header. Names in `Tarnik::Detail` are for the libraries themselves."]
     for folder, name, title, what in LIBRARIES:
         parts.append(f"## {title}")
         rows = []

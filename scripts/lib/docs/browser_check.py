@@ -19,8 +19,8 @@ import threading
 import time
 from pathlib import Path
 
-PAGES = ["index.html", "getting-started.html", "guide.html", "architecture.html", "performance.html", "security.html",
-         "api/index.html", "api/access/token_gate.html", "api/ssoclient/saml_token.html"]
+# Besides all pages of the manual
+PAGES = ["api/index.html", "api/access/token_gate.html", "api/ssoclient/saml_token.html", "decisions/index.html"]
 WIDTHS = [400, 1400]
 # What is searched, and a page that must be among the results
 SEARCHES = [("CreateTokenGate", "api/access/token_gate.html"), ("wrong password", "guide.html")]
@@ -171,7 +171,8 @@ class Check:
         browser = self.browser
         browser.open(base + "index.html", width)
         browser.call("Runtime.evaluate", expression="document.querySelector('.md-search__input').focus()")
-        browser.wait_for("document.getElementById('__search').checked")
+        # What is typed before the index has been read would not be searched.
+        browser.wait_for("document.querySelector('.md-search-result__meta').textContent.includes('Type to start')")
         for character in text:
             browser.call("Input.dispatchKeyEvent", type="keyDown", text=character)
             browser.call("Input.dispatchKeyEvent", type="keyUp")
@@ -186,8 +187,9 @@ class Check:
             ("127.0.0.1", 0), lambda *arguments: Handler(*arguments, directory=str(self.site)))
         threading.Thread(target=server.serve_forever, daemon=True).start()
         base = f"http://127.0.0.1:{server.server_port}/"
+        pages = sorted(path.name for path in self.site.glob("*.html")) + PAGES
         for width in WIDTHS:
-            for page in PAGES:
+            for page in pages:
                 self.look(base, page, width, "light")
             self.look(base, "index.html", width, "dark")
             for text, expected in SEARCHES:
