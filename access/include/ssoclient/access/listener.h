@@ -15,7 +15,11 @@
 namespace SsoClient::Access {
 
 /// What an attempt asks the service for.
-enum class AttemptOperation { kLogin, kRenewal, kExchange };
+enum class AttemptOperation {
+  kLogin,     ///< a token by the login of the source
+  kRenewal,   ///< the token that the source has, with a new lifetime
+  kExchange,  ///< a token by the token of another source
+};
 
 /// One request, or one negotiation, at one endpoint; or a failed call of the function of a
 /// `PasswordLogin`, which no endpoint is chosen for.
@@ -35,9 +39,12 @@ struct AttemptRecord {
   int httpStatus = 0;  ///< of the last answer; 0 without an answer
 };
 
-/// Whether requests go to an endpoint: all of them, none until its next probe, or only the probe
-/// that is under way.
-enum class CircuitState { kClosed, kOpen, kHalfOpen };
+/// Whether requests go to an endpoint.
+enum class CircuitState {
+  kClosed,    ///< all of them
+  kOpen,      ///< none, until its next probe
+  kHalfOpen,  ///< only the probe that is under way
+};
 
 /// An endpoint's circuit has changed.
 struct CircuitRecord {

@@ -17,7 +17,11 @@ namespace SsoClient::Access {
 class SSOCLIENT_ACCESS_EXPORT Presenter {
  public:
   /// What the server knows.
-  enum class Kind { kNobody, kTlsCertificate, kSignature };
+  enum class Kind {
+    kNobody,          ///< nothing
+    kTlsCertificate,  ///< the certificate of the sender's TLS connection
+    kSignature,       ///< a signature by the sender
+  };
 
   /// Nothing is known: holder-of-key tokens are refused.
   static Presenter Nobody();

@@ -23,7 +23,11 @@ namespace SsoClient::Access {
 
 /// Whether bearer tokens are accepted, which anybody can present who has seen them. A bearer token
 /// stays one when its presenter has a certificate.
-enum class BearerTokens { kNotSaid, kRefuse, kAccept };
+enum class BearerTokens {
+  kNotSaid,  ///< `CreateTokenGate` refuses the configuration
+  kRefuse,   ///< only holder-of-key tokens are accepted
+  kAccept,   ///< both are
+};
 
 /// The tokens that a gate remembers, so that it need not read and verify them again.
 struct GateCacheConfig {

@@ -30,8 +30,12 @@ enum class CheckKind {
   kPredicate,      ///< `GateConfig::predicate`
 };
 
-/// The result of a check. No check is reached after one that has failed.
-enum class CheckOutcome { kPassed, kFailed, kNotReached };
+/// The result of a check.
+enum class CheckOutcome {
+  kPassed,      ///< the token fulfils the rule
+  kFailed,      ///< it does not, which decides the verdict
+  kNotReached,  ///< an earlier check has failed
+};
 
 /// Why a token was refused, for programs. Later versions may add some.
 enum class Reason {

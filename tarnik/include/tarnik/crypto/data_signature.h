@@ -12,15 +12,15 @@ namespace Tarnik::Crypto {
 /// A signature algorithm with its hash. There are no others.
 enum class SignatureAlgorithm {
   kRsaPkcs1Sha256,  ///< RSASSA-PKCS1-v1_5 (RFC 8017, section 8.2)
-  kRsaPkcs1Sha384,
-  kRsaPkcs1Sha512,
+  kRsaPkcs1Sha384,  ///< the same with SHA-384
+  kRsaPkcs1Sha512,  ///< the same with SHA-512
   kRsaPssSha256,  ///< RSASSA-PSS (RFC 8017, section 8.1); MGF1 with the same hash, whose length the
                   ///< salt has
-  kRsaPssSha384,
-  kRsaPssSha512,
-  kEcdsaSha256,  ///< ECDSA (FIPS 186-5, section 6) on P-256, P-384 or P-521
-  kEcdsaSha384,
-  kEcdsaSha512,
+  kRsaPssSha384,  ///< the same with SHA-384
+  kRsaPssSha512,  ///< the same with SHA-512
+  kEcdsaSha256,   ///< ECDSA (FIPS 186-5, section 6) on P-256, P-384 or P-521
+  kEcdsaSha384,   ///< the same with SHA-384
+  kEcdsaSha512,   ///< the same with SHA-512
 };
 
 /// True when `signature` is a signature of `data` that was made with the private key of

@@ -6,8 +6,13 @@
 
 namespace Tarnik::Crypto {
 
-/// The kind of a key: RSA, RSA restricted to PSS (RFC 4055), elliptic curve, or any other.
-enum class KeyAlgorithm { kRsa, kRsaPss, kEc, kOther };
+/// The kind of a key.
+enum class KeyAlgorithm {
+  kRsa,     ///< RSA
+  kRsaPss,  ///< RSA, restricted to RSASSA-PSS (RFC 4055, section 1.2)
+  kEc,      ///< an elliptic curve, for ECDSA
+  kOther,   ///< any other, which no signature algorithm of this library uses
+};
 
 /// A public key. Immutable; thread-safe. Returned by `Certificate::GetPublicKey` and
 /// `PrivateKey::GetPublicKey`.

@@ -9,7 +9,10 @@
 namespace Tarnik::Http {
 
 /// The methods that requests may have (RFC 9110, section 9.3).
-enum class Method { GET, POST };
+enum class Method {
+  GET,  ///< with a body only if one is written
+  POST  ///< with a body, which may be empty
+};
 
 /// A request that is sent once. Used by one thread at a time until it is sent. Its body is cleansed
 /// from memory when it is destroyed.

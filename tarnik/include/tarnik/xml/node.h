@@ -14,14 +14,13 @@ class ElementNode;
 class ParentNode;
 class Tree;
 
-/// What a node is. The kind decides its class: `ElementNode`, `TextNode`, `CommentNode`,
-/// `ProcessingInstructionNode` or `Document`.
+/// What a node is, which decides its class.
 enum class NodeKind : unsigned char {
-  kElement,
-  kText,
-  kComment,
-  kProcessingInstruction,
-  kDocument
+  kElement,                ///< `ElementNode`
+  kText,                   ///< `TextNode`
+  kComment,                ///< `CommentNode`
+  kProcessingInstruction,  ///< `ProcessingInstructionNode`
+  kDocument                ///< `Document`
 };
 
 /// A node of the document tree.
