@@ -18,16 +18,6 @@ std::string Formatted(const char* format, unsigned value) {
   return text.data();
 }
 
-// Two escapes for the characters beyond the first 65536 (RFC 8259, section 7).
-std::string Escape(char32_t codePoint) {
-  if (codePoint < 0x10000) {
-    return Formatted("\\u%04x", static_cast<unsigned>(codePoint));
-  }
-  const auto rest = static_cast<unsigned>(codePoint - 0x10000);
-  return Formatted("\\u%04x", 0xD800U + (rest >> 10)) +
-         Formatted("\\u%04x", 0xDC00U + (rest & 0x3FFU));
-}
-
 bool IsUnsafe(std::string_view character) {
   return character != "?" && character != "\n" && Tarnik::ToDisplayText(character, 4) == "?";
 }
@@ -61,7 +51,9 @@ std::string SafeText(const Console& console, std::string_view text) {
 
 std::string SafeJson(std::string_view json) {
   return Rewritten(json, [](std::string_view character) {
-    return IsUnsafe(character) ? Escape(CodePointOf(character)) : std::string(character);
+    // All of them are below U+10000, where one escape is enough.
+    return IsUnsafe(character) ? Formatted("\\u%04x", static_cast<unsigned>(CodePointOf(character)))
+                               : std::string(character);
   });
 }
 

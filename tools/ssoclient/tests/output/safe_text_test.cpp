@@ -41,10 +41,16 @@ TEST(SafeTextTest, JsonKeepsItsMeaningWithoutUnsafeCharacters) {
   EXPECT_NE(text.find("🔑"), std::string::npos);
 }
 
-TEST(SafeTextTest, JsonEscapesCharactersBeyondTheFirstPlaneInTwoParts) {
-  const std::string tag = "\U000E0041";
-  const std::string text = SafeJson("\"" + tag + "\"");
-  EXPECT_EQ(nlohmann::json::parse(text), nlohmann::json(tag)) << text;
+// One escape would not be enough beyond U+FFFF.
+TEST(SafeTextTest, EveryCharacterThatIsEscapedIsInTheFirstPlane) {
+  constexpr char32_t kStep = 0x7F;  // in milliseconds
+  for (char32_t codePoint = 0x10000; codePoint <= 0x10FFFF; codePoint += kStep) {
+    const std::string character{static_cast<char>(0xF0 | (codePoint >> 18)),
+                                static_cast<char>(0x80 | (codePoint >> 12 & 0x3F)),
+                                static_cast<char>(0x80 | (codePoint >> 6 & 0x3F)),
+                                static_cast<char>(0x80 | (codePoint & 0x3F))};
+    ASSERT_EQ(SafeJson(character), character) << std::hex << static_cast<unsigned>(codePoint);
+  }
 }
 
 }  // namespace
