@@ -7,6 +7,10 @@
 
 namespace SsoClient::Tool {
 
+std::unique_ptr<Command> MakeLoginCommand();
+std::unique_ptr<Command> MakeRenewCommand();
+std::unique_ptr<Command> MakeValidateCommand();
+std::unique_ptr<Command> MakeExchangeCommand();
 std::unique_ptr<Command> MakeShowCommand();
 std::unique_ptr<Command> MakeVerifyCommand();
 
