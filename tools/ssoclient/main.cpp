@@ -1,7 +1,10 @@
 #include "output/console.h"
+#include "process.h"
 #include "program.h"
 
 int main(int argc, char** argv) {
-  using SsoClient::Tool::Console;
-  return static_cast<int>(SsoClient::Tool::RunProgram(argc, argv, Console::OfProcess()));
+  using namespace SsoClient::Tool;
+  PrepareProcess();
+  const Console console = Console::OfProcess();
+  EndProcess(FinishOutput(console, RunProgram(argc, argv, console)));
 }

@@ -2,7 +2,6 @@
 
 #include <utility>
 
-#include <ssoclient/access/failure_kind.h>
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 
@@ -53,13 +52,16 @@ std::string RemedyFor(FailureKind kind) {
 ToolException::ToolException(Failure failure)
     : std::runtime_error(failure.message), failure_(std::move(failure)) {}
 
+Failure MakeFailure(FailureKind kind, std::string message) {
+  return {StatusOf(kind), Access::NameOf(kind), std::move(message), RemedyFor(kind)};
+}
+
 Failure FailureOf(const std::exception& exception) {
   if (const auto* own = dynamic_cast<const ToolException*>(&exception)) {
     return own->What();
   }
   if (const auto* known = dynamic_cast<const Tarnik::Exception*>(&exception)) {
-    const FailureKind kind = Access::Classify(*known);
-    return {StatusOf(kind), Access::NameOf(kind), known->what(), RemedyFor(kind)};
+    return MakeFailure(Access::Classify(*known), known->what());
   }
   return {ExitStatus::kLocal, "local", exception.what(), ""};
 }

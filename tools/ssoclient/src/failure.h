@@ -5,6 +5,8 @@
 #include <stdexcept>
 #include <string>
 
+#include <ssoclient/access/failure_kind.h>
+
 #include "exit_status.h"
 
 namespace SsoClient::Tool {
@@ -27,6 +29,9 @@ class ToolException : public std::runtime_error {
  private:
   Failure failure_;
 };
+
+/// A failure of the kind, with its status and its remedy.
+Failure MakeFailure(Access::FailureKind kind, std::string message);
 
 /// The failure that an exception of this program or of the libraries means.
 Failure FailureOf(const std::exception& exception);

@@ -1,9 +1,15 @@
-#include "commands/command.h"
+#include "commands/commands.h"
 
 namespace SsoClient::Tool {
 
 std::vector<std::unique_ptr<Command>> MakeCommands() {
   std::vector<std::unique_ptr<Command>> all;
+  all.push_back(MakeLoginCommand());
+  all.push_back(MakeRenewCommand());
+  all.push_back(MakeValidateCommand());
+  all.push_back(MakeExchangeCommand());
+  all.push_back(MakeShowCommand());
+  all.push_back(MakeVerifyCommand());
   return all;
 }
 

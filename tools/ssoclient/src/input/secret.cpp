@@ -43,10 +43,12 @@ void SecretOption::AddTo(CLI::App& command, const std::string& name) {
   name_ = name;
   CLI::Option* const file = command.add_option(
       "--" + name + "-file", file_, "Read the " + name + " from the first line of this file");
+  file->type_name("FILE");
   command
       .add_option("--" + name + "-fd", descriptor_,
                   "Read the " + name + " from the first line of this file descriptor")
       ->check(CLI::NonNegativeNumber)
+      ->type_name("NUMBER")
       ->excludes(file);
 }
 

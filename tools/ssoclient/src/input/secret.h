@@ -19,6 +19,8 @@ class SecretOption {
   /// "password", for example. The object must live as long as the command.
   void AddTo(CLI::App& command, const std::string& name);
 
+  bool IsGiven() const { return !file_.empty() || descriptor_ >= 0; }
+
   /// The secret: the first line of the file or the descriptor, or what the user types at the
   /// terminal of the process without echo after `prompt`. What is after the first line of a
   /// descriptor stays there for others. Throws `ToolException` when there is neither (with the

@@ -38,7 +38,7 @@ void ConnectionOptions::AddTo(CLI::App& command) {
   command
       .add_option("--ca", caFiles,
                   "A PEM file of CAs that the service's TLS certificate is trusted from; without "
-                  "it, those of the system. May be repeated")
+                  "it, those of the system; may be repeated")
       ->envname("SSOCLIENT_CA")
       ->type_name("FILE")
       ->allow_extra_args(false)
@@ -49,9 +49,9 @@ void ConnectionOptions::AddTo(CLI::App& command) {
       ->type_name("NAME")
       ->group(group);
   command
-      .add_option("--tls-crl", crlFiles,
-                  "A PEM file of revocation lists for the service's TLS certificate. May be "
-                  "repeated")
+      .add_option(
+          "--tls-crl", crlFiles,
+          "A PEM file of revocation lists for the service's TLS certificate; may be repeated")
       ->type_name("FILE")
       ->allow_extra_args(false)
       ->group(group);

@@ -1,0 +1,19 @@
+#ifndef SSOCLIENT_TOOL_COMMANDS_COMMANDS_H
+#define SSOCLIENT_TOOL_COMMANDS_COMMANDS_H
+
+#include <memory>
+
+#include "commands/command.h"
+
+namespace SsoClient::Tool {
+
+std::unique_ptr<Command> MakeLoginCommand();
+std::unique_ptr<Command> MakeRenewCommand();
+std::unique_ptr<Command> MakeValidateCommand();
+std::unique_ptr<Command> MakeExchangeCommand();
+std::unique_ptr<Command> MakeShowCommand();
+std::unique_ptr<Command> MakeVerifyCommand();
+
+}  // namespace SsoClient::Tool
+
+#endif

@@ -1,0 +1,69 @@
+#include "options/service_options.h"
+
+#include <CLI/CLI.hpp>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/certificate.h>
+
+#include "failure.h"
+
+namespace SsoClient::Tool {
+
+void ServiceOptions::AddConnectionTo(CLI::App& command) {
+  connection_.AddTo(command);
+  command
+      .add_flag("--allow-http", isHttpAllowed_,
+                "Accept an http URL, over which everybody on the way can read passwords and tokens")
+      ->group("Connection");
+}
+
+void ServiceOptions::AddSignersTo(CLI::App& command) {
+  command
+      .add_option(
+          "--sts-certificate", signerFiles_,
+          "A file of certificates, in PEM or DER, that the service signs tokens with; may be "
+          "repeated")
+      ->envname("SSOCLIENT_STS_CERTIFICATE")
+      ->type_name("FILE")
+      ->allow_extra_args(false)
+      ->group("Connection");
+}
+
+Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> ServiceOptions::Signers() const {
+  if (signerFiles_.empty()) {
+    throw ToolException(
+        {ExitStatus::kUsage, "no-sts-certificate",
+         "without the service's signing certificate, nobody can verify the token",
+         "get the certificate from those who operate the service, by a way that you trust, and "
+         "pass it with --sts-certificate or SSOCLIENT_STS_CERTIFICATE"});
+  }
+  std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>> all;
+  for (const std::string& path : signerFiles_) {
+    try {
+      const auto certificates = Tarnik::Crypto::LoadPemOrDerCertificates(path);
+      all.insert(all.end(), certificates.begin(), certificates.end());
+    } catch (const Tarnik::Exception& failure) {
+      throw ToolException({ExitStatus::kLocal, "sts-certificate",
+                           "cannot use " + path + ": " + failure.what(),
+                           "check the file of --sts-certificate"});
+    }
+  }
+  return Tarnik::Xml::Security::CreateTrustedCertificatesResolver(all);
+}
+
+ServiceSetup ServiceOptions::MakeSetup() const {
+  ServiceSetup setup;
+  setup.address = connection_.Address();
+  setup.peerName = connection_.peerName;
+  setup.timeoutSec = connection_.timeoutSec;
+  if (setup.address.isHttps) {
+    setup.sslContext = connection_.MakeSslContext();
+  } else if (!isHttpAllowed_) {
+    throw ToolException({ExitStatus::kUsage, "plain-http",
+                         "over http, everybody on the way can read passwords and tokens",
+                         "use an https URL, or accept this with --allow-http"});
+  }
+  return setup;
+}
+
+}  // namespace SsoClient::Tool
