@@ -1,5 +1,7 @@
 #include "devsts/server.h"
 
+#include <memory>
+#include <mutex>
 #include <stdexcept>
 #include <utility>
 
@@ -14,7 +16,14 @@
 namespace DevSts {
 namespace {
 
-Credential MakeAuthority() {
+bool IsGiven(const Credential& credential) {
+  return !credential.certificatePem.empty();
+}
+
+Credential AuthorityOf(const ServerOptions& options) {
+  if (IsGiven(options.keys.authority)) {
+    return options.keys.authority;
+  }
   CertificateSpec spec;
   spec.commonName = "Dev STS CA";
   spec.isAuthority = true;
@@ -28,6 +37,29 @@ Credential MakeSigner(KeyType keyType, bool freshKey) {
   spec.keyType = keyType;
   spec.freshKey = freshKey;
   return MakeCertificate(spec);
+}
+
+Credential SignerOf(const ServerOptions& options) {
+  return IsGiven(options.keys.signing) ? options.keys.signing
+                                       : MakeSigner(options.assertion.signingKey, false);
+}
+
+// What connections over TLS use.
+struct TlsIdentity {
+  ServerIdentity identity;
+  std::shared_ptr<SSL_CTX> context;
+};
+
+TlsIdentity MakeTlsIdentity(const TlsOptions& options, const ServerKeys& keys,
+                            const Credential& authority) {
+  TlsIdentity made;
+  if (options.certificate == ServerCertificate::Valid && IsGiven(keys.server)) {
+    made.identity.credential = keys.server;
+  } else {
+    made.identity = MakeServerIdentity(options, authority);
+  }
+  made.context = MakeTlsContext(options, made.identity, authority);
+  return made;
 }
 
 std::string Bracketed(const std::string& address) {
@@ -45,18 +77,28 @@ class Server::Impl {
  public:
   explicit Impl(ServerOptions serverOptions)
       : options(std::move(serverOptions)),
-        authority(MakeAuthority()),
-        signing(MakeSigner(options.assertion.signingKey, false)),
-        identity(MakeServerIdentity(options.tls, authority)),
-        tls(MakeTlsContext(options.tls, identity, authority)),
+        authority(AuthorityOf(options)),
+        signing(SignerOf(options)),
+        tls(MakeTlsIdentity(options.tls, options.keys, authority)),
         service(options, signing),
         observation(options.requestLogLimit),
         httpListener(options.address, options.httpPort,
                      [this](int socket) { Take(socket, nullptr); }),
         httpsListener(options.address, options.httpsPort,
-                      [this](int socket) { Take(socket, tls.get()); }) {}
+                      [this](int socket) { Take(socket, Tls().context.get()); }) {}
 
   ~Impl() { threads.Stop(); }
+
+  TlsIdentity Tls() const {
+    const std::lock_guard lock(tlsMutex);
+    return tls;
+  }
+
+  void SetTls(const TlsOptions& tlsOptions) {
+    TlsIdentity made = MakeTlsIdentity(tlsOptions, options.keys, authority);
+    const std::lock_guard lock(tlsMutex);
+    tls = std::move(made);
+  }
 
   void Take(int socket, SSL_CTX* context) {
     observation.Count([](Counters& counters) {
@@ -79,8 +121,8 @@ class Server::Impl {
   const ServerOptions options;
   const Credential authority;
   const Credential signing;
-  const ServerIdentity identity;
-  const SslContextHandle tls;
+  mutable std::mutex tlsMutex;
+  TlsIdentity tls;
   Service service;
   MisbehaviorPlan plan;
   Observation observation;
@@ -119,7 +161,7 @@ std::string Server::CaCertificatePem() const {
 }
 
 std::string Server::ServerCertificatePem() const {
-  return impl_->identity.credential.certificatePem;
+  return impl_->Tls().identity.credential.certificatePem;
 }
 
 std::string Server::SigningCertificatePem() const {
@@ -156,6 +198,10 @@ bool Server::Revoke(const std::string& assertionId) {
 
 void Server::SetAssertionOptions(AssertionOptions options) {
   impl_->service.SetAssertionOptions(std::move(options));
+}
+
+void Server::SetTlsOptions(const TlsOptions& options) {
+  impl_->SetTls(options);
 }
 
 void Server::SetNegotiationScript(NegotiationScript script) {

@@ -43,6 +43,13 @@ struct CertificateSpec {
 /// Makes a certificate signed by `issuer`, or a self-signed one if `issuer` is null.
 Credential MakeCertificate(const CertificateSpec& spec, const Credential* issuer = nullptr);
 
+/// Makes a certificate revocation list (RFC 5280, section 5) of `issuer`, which must be an
+/// authority, with the given certificates. It is valid for `validity` from now, and its number
+/// grows from one call to a later one.
+std::string MakeRevocationList(const Credential& issuer,
+                               const std::vector<std::string>& revokedCertificatePems,
+                               std::chrono::seconds validity = std::chrono::hours(30L * 24));
+
 }  // namespace DevSts
 
 #endif

@@ -34,6 +34,9 @@ class KerberosRealm {
   void AddUser(const std::string& name, const std::string& password);
   /// Adds a principal with a random key and returns the path of a keytab that contains the key.
   std::string AddKeytab(const std::string& principal);
+  /// Writes a keytab with the present keys of a principal, so that a user can log in by password
+  /// and by keytab.
+  void WriteKeytab(const std::string& principal, const std::string& path);
   /// Acquires a ticket for the user and returns the name of a credential cache that contains it, in
   /// the form of the environment variable KRB5CCNAME.
   std::string Login(const std::string& name, const std::string& password,

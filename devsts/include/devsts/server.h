@@ -97,8 +97,18 @@ struct AssertionOptions {
   }
 };
 
+/// Keys that a server uses in place of new ones, each with its certificate. The server makes a new
+/// key for each credential that is empty.
+struct ServerKeys {
+  Credential authority = {};
+  /// For TLS, issued by the authority; only used with `ServerCertificate::Valid`.
+  Credential server = {};
+  /// Signs the assertions. Of the type `AssertionOptions::signingKey`.
+  Credential signing = {};
+};
+
 struct ServerOptions {
-  /// The numeric loopback address to listen on, "127.0.0.1" or "::1".
+  /// The numeric address to listen on; usually a loopback address, "127.0.0.1" or "::1".
   std::string address = "127.0.0.1";
   /// 0 takes a free port.
   std::uint16_t httpPort = 0;
@@ -123,6 +133,7 @@ struct ServerOptions {
   /// Called once for each request, on the connection's thread, after the answer has been determined
   /// and before it is sent.
   std::function<void(const ReceivedRequest&)> onRequest;
+  ServerKeys keys;
 };
 
 /// How a request is signed, by the form of the reference in its ds:KeyInfo.
@@ -231,6 +242,10 @@ class Server {
   bool Revoke(const std::string& assertionId);
 
   void SetAssertionOptions(AssertionOptions options);
+
+  /// Applies to connections that are accepted from now on. A certificate that is made for these
+  /// options is issued by the same authority. Throws `std::runtime_error` if it cannot be made.
+  void SetTlsOptions(const TlsOptions& options);
 
   void SetNegotiationScript(NegotiationScript script);
   /// The number of negotiations in progress.

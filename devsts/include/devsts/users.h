@@ -9,6 +9,7 @@ namespace DevSts {
 
 /// An account of the STS.
 struct User {
+  /// A user with an empty password cannot log in by password.
   std::string password;
   bool passwordExpired = false;
   /// Each in the form "DOMAIN\group".

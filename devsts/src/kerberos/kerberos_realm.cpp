@@ -195,6 +195,10 @@ std::string KerberosRealm::AddKeytab(const std::string& principal) {
   return path;
 }
 
+void KerberosRealm::WriteKeytab(const std::string& principal, const std::string& path) {
+  state_->Administer("ktadd -norandkey -k " + Checked(path) + " " + Checked(principal));
+}
+
 std::string KerberosRealm::Login(const std::string& name, const std::string& password,
                                  std::chrono::seconds lifetime) {
   std::string path = "FILE:" + state_->folder + "/cache-" + std::to_string(++state_->caches);

@@ -54,7 +54,8 @@ void Accounts::AddCertificate(const std::string& name, const std::string& certif
 User Accounts::Authenticate(const std::string& name, const std::string& password) const {
   const std::lock_guard lock(mutex_);
   const auto found = users_.find(name);
-  if (found == users_.end() || !Equal(found->second.password, password)) {
+  if (found == users_.end() || found->second.password.empty() ||
+      !Equal(found->second.password, password)) {
     ThrowFailedAuthentication("Invalid credentials");
   }
   if (found->second.passwordExpired) {

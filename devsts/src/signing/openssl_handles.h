@@ -23,6 +23,7 @@ struct FreeWith {
 using BioHandle = std::unique_ptr<BIO, FreeWith<BIO_free_all>>;
 using KeyHandle = std::unique_ptr<EVP_PKEY, FreeWith<EVP_PKEY_free>>;
 using KeyContextHandle = std::unique_ptr<EVP_PKEY_CTX, FreeWith<EVP_PKEY_CTX_free>>;
+using RevocationListHandle = std::unique_ptr<X509_CRL, FreeWith<X509_CRL_free>>;
 using DigestContextHandle = std::unique_ptr<EVP_MD_CTX, FreeWith<EVP_MD_CTX_free>>;
 using CertificateHandle = std::unique_ptr<X509, FreeWith<X509_free>>;
 using SslContextHandle = std::unique_ptr<SSL_CTX, FreeWith<SSL_CTX_free>>;

@@ -1,0 +1,77 @@
+#include "control_client.h"
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <iostream>
+#include <stdexcept>
+
+#include <unistd.h>
+
+#include "command_line.h"
+#include "control_socket.h"
+#include "errors.h"
+
+namespace DevSts::Program {
+namespace {
+
+Descriptor ConnectTo(const std::string& path) {
+  const sockaddr_un address = AddressOf(path);
+  Descriptor connection(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
+  if (connect(connection.Get(), reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0) {
+    throw std::runtime_error(path + ": no service listens: " + std::strerror(errno));
+  }
+  return connection;
+}
+
+// The service may end the connection before it has read everything, after an error.
+void SendLine(int connection, const std::string& line) {
+  const std::string text = line + "\n";
+  for (std::size_t at = 0; at < text.size();) {
+    const ssize_t size = send(connection, text.data() + at, text.size() - at, MSG_NOSIGNAL);
+    if (size <= 0) {
+      return;
+    }
+    at += static_cast<std::size_t>(size);
+  }
+}
+
+std::string ReadLine(int connection) {
+  std::array<char, 4096> octets{};
+  std::string text;
+  for (;;) {
+    const ssize_t size = recv(connection, octets.data(), octets.size(), 0);
+    if (size <= 0) {
+      throw std::runtime_error("the service did not answer");
+    }
+    text.append(octets.data(), static_cast<std::size_t>(size));
+    const std::size_t end = text.find('\n');
+    if (end != std::string::npos) {
+      return text.substr(0, end);
+    }
+  }
+}
+
+}  // namespace
+
+int RunControlClient(const std::string& path, const std::vector<std::string>& command) {
+  try {
+    const std::string line = LineOf(command);
+    const Descriptor connection = ConnectTo(path);
+    SendLine(connection.Get(), line);
+    const std::string answer = ReadLine(connection.Get());
+    const std::size_t space = std::min(answer.find(' '), answer.size() - 1);
+    const std::string text = answer.substr(space + 1);
+    if (answer.substr(0, space) == "ok") {
+      std::cout << text << std::endl;
+      return 0;
+    }
+    std::cerr << "ssoclient-devsts: " << text << '\n';
+  } catch (const std::exception& error) {
+    std::cerr << "ssoclient-devsts: " << error.what() << '\n';
+  }
+  return 1;
+}
+
+}  // namespace DevSts::Program

@@ -1,0 +1,57 @@
+#ifndef DEVSTS_PROGRAM_FILES_H
+#define DEVSTS_PROGRAM_FILES_H
+
+#include <string>
+
+#include <sys/types.h>
+
+namespace DevSts::Program {
+
+// Each function throws FileError with the path and the system's reason.
+
+// The content of a file of at most a few megabytes.
+std::string ReadWhole(const std::string& path);
+
+enum class Readers { Everybody, OwnerOnly };
+
+// Replaces the file as a whole: readers see the old content or the new one, never a part.
+void WriteWhole(const std::string& path, const std::string& text,
+                Readers readers = Readers::Everybody);
+
+void MakeFolder(const std::string& path);
+bool Exists(const std::string& path);
+
+// A file that exists as long as the object, unless somebody else replaces it.
+class TemporaryFile {
+ public:
+  TemporaryFile(std::string path, std::string text);
+  ~TemporaryFile();
+  TemporaryFile(const TemporaryFile&) = delete;
+  TemporaryFile& operator=(const TemporaryFile&) = delete;
+
+ private:
+  std::string path_;
+  std::string text_;
+};
+
+// A file descriptor that the destructor closes.
+class Descriptor {
+ public:
+  Descriptor() = default;
+  explicit Descriptor(int number) : number_(number) {}
+  ~Descriptor();
+  Descriptor(Descriptor&& other) noexcept;
+  Descriptor& operator=(Descriptor&& other) noexcept;
+
+  int Get() const { return number_; }
+
+ private:
+  int number_ = -1;
+};
+
+// Writes everything, and ignores errors of a reader that has gone.
+void WriteToDescriptor(int descriptor, const std::string& text);
+
+}  // namespace DevSts::Program
+
+#endif

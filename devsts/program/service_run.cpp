@@ -1,0 +1,231 @@
+#include "service_run.h"
+
+#include <csignal>
+#include <memory>
+#include <optional>
+#include <string>
+#include <system_error>
+#include <utility>
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include "accounts_file.h"
+#include "commands.h"
+#include "control_socket.h"
+#include "end_wait.h"
+#include "errors.h"
+#include "files.h"
+#include "help_texts.h"
+#include "keys.h"
+#include "realm.h"
+#include "report.h"
+#include "revocations.h"
+#include "state_folder.h"
+
+namespace DevSts::Program {
+namespace {
+
+void WarnLoudly(const Options& options) {
+  std::string text =
+      "ssoclient-devsts: this is a Security Token Service FOR TESTS ONLY; it protects nothing\n";
+  if (options.isExposed) {
+    text += "ssoclient-devsts: WARNING: listening on " + options.server.address +
+            ", where others can reach it and log in with known passwords\n";
+  }
+  WriteToDescriptor(STDERR_FILENO, text);
+}
+
+AccountsFile AccountsOf(const Options& options) {
+  AccountsFile accounts =
+      options.accountsFile.empty() ? DemoAccounts() : ReadAccounts(options.accountsFile);
+  accounts.startsRealm = accounts.startsRealm || options.startsRealm;
+  if (!options.userKeytabs.empty()) {
+    accounts.userKeytabs = options.userKeytabs;
+  }
+  if (!options.server.negotiation.keytab.empty()) {
+    accounts.keytab = options.server.negotiation.keytab;
+  }
+  if (accounts.startsRealm && !accounts.keytab.empty()) {
+    throw UsageError("a realm and a keytab exclude each other");
+  }
+  if (!accounts.userKeytabs.empty() && !accounts.startsRealm) {
+    throw UsageError("keytabs for users need a realm");
+  }
+  if (accounts.startsRealm) {
+    RequireRealmUsers(accounts, options.accountsFile);
+  }
+  return accounts;
+}
+
+KeyPlan PlanOf(const Options& options) {
+  KeyPlan plan;
+  plan.signingKey = options.server.assertion.signingKey;
+  plan.signingByAuthority = options.signingByAuthority;
+  return plan;
+}
+
+void WriteOut(const std::string& folder, const Keys& keys) {
+  MakeFolder(folder);
+  WriteWhole(folder + "/ca.pem", keys.authority.certificatePem);
+  WriteWhole(folder + "/signing.pem", keys.signing.certificatePem);
+  WriteWhole(folder + "/client.pem", keys.client.certificatePem);
+  WriteWhole(folder + "/client-key.pem", keys.client.privateKeyPem, Readers::OwnerOnly);
+}
+
+Revocations RevocationsOf(const Options& options, const Keys& keys) {
+  Revocations revocations(keys, options.stateFolder);
+  for (const std::string& folder : {options.stateFolder, options.outFolder}) {
+    if (!folder.empty()) {
+      revocations.WriteTo(folder);
+    }
+  }
+  return revocations;
+}
+
+// The users, one of whom owns the client certificate.
+Users UsersOf(const AccountsFile& accounts, const Keys& keys) {
+  Users users = accounts.users;
+  if (!accounts.clientUser.empty()) {
+    users.at(accounts.clientUser).certificates.push_back(keys.client.certificatePem);
+  }
+  return users;
+}
+
+Descriptor OpenLog(const std::string& path) {
+  if (path.empty()) {
+    return {};
+  }
+  Descriptor log(open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0644));
+  if (log.Get() < 0) {
+    throw FileError(path + ": cannot be written");
+  }
+  return log;
+}
+
+std::unique_ptr<Server> StartServer(ServerOptions options) {
+  if (!options.negotiation.keytab.empty() &&
+      access(options.negotiation.keytab.c_str(), R_OK) != 0) {
+    throw FileError(options.negotiation.keytab + ": the keytab cannot be read");
+  }
+  try {
+    return std::make_unique<Server>(std::move(options));
+  } catch (const std::system_error& error) {
+    const std::error_code code = error.code();
+    if (code != std::errc::address_in_use && code != std::errc::address_not_available &&
+        code != std::errc::permission_denied) {
+      throw;
+    }
+    throw ProgramError(ExitStatus::Port, std::string("a port cannot be opened: ") + error.what());
+  }
+}
+
+std::string ReadyLines(const Server& server, const StartedRealm* realm) {
+  return "http_url=" + server.HttpUrl() + "\nhttps_url=" + server.HttpsUrl() + "\n" +
+         (realm != nullptr ? realm->Lines() : "");
+}
+
+// Everything that the service consists of, in the order in which it is made.
+class Service {
+ public:
+  explicit Service(Options options)
+      : options_(std::move(options)),
+        log_(OpenLog(options_.logFile)),
+        requestLines_(options_.isQuiet           ? -1
+                      : options_.logFile.empty() ? STDOUT_FILENO
+                                                 : log_.Get()) {
+    const AccountsFile accounts = AccountsOf(options_);
+    if (!options_.stateFolder.empty()) {
+      state_.emplace(options_.stateFolder);
+    }
+    if (!options_.controlPath.empty()) {
+      control_.emplace(options_.controlPath);
+    }
+    const Keys keys = state_ ? state_->LoadOrMake(PlanOf(options_)) : MakeKeys(PlanOf(options_));
+    if (!options_.outFolder.empty()) {
+      WriteOut(options_.outFolder, keys);
+    }
+    Revocations revocations = RevocationsOf(options_, keys);
+    if (accounts.startsRealm) {
+      realm_.emplace(accounts);
+    }
+    Serve(accounts, keys, std::move(revocations));
+  }
+  ~Service() {
+    if (control_) {
+      control_->Stop();  // before the commands are destroyed
+    }
+  }
+  Service(const Service&) = delete;
+  Service& operator=(const Service&) = delete;
+
+  // Accepts commands, and says that the service is ready.
+  void Announce(const std::function<void()>& ready) {
+    if (control_) {
+      control_->Start(*commands_, [this] { end_.Request(); });
+    }
+    const std::string lines = ReadyLines(*server_, realm_ ? &*realm_ : nullptr);
+    if (!options_.pidFile.empty()) {
+      pidFile_.emplace(options_.pidFile, std::to_string(getpid()) + "\n");
+    }
+    if (!options_.readyFile.empty()) {
+      readyFile_.emplace(options_.readyFile, lines);
+    }
+    WriteToDescriptor(STDOUT_FILENO, lines + "ready\n");
+    ready();
+  }
+
+  void WaitForEnd() {
+    LineOutput answers(STDOUT_FILENO);
+    end_.Wait(options_.endsWithStdin, [&](const std::string& line) {
+      const Commands::Answer answer = commands_->Execute(line);
+      answers.Write(answer.line);
+      return !answer.quits;
+    });
+  }
+
+ private:
+  void Serve(const AccountsFile& accounts, const Keys& keys, Revocations revocations) {
+    ServerOptions serverOptions = options_.server;
+    serverOptions.users = UsersOf(accounts, keys);
+    serverOptions.keys = {keys.authority, keys.server, keys.signing};
+    serverOptions.negotiation.keytab = realm_ ? realm_->Keytab() : accounts.keytab;
+    // The principals of the options take precedence.
+    serverOptions.negotiation.principals.insert(accounts.principals.begin(),
+                                                accounts.principals.end());
+    serverOptions.onRequest = [this](const ReceivedRequest& request) {
+      requestLines_.Write("request " + DescribeRequest(request));
+    };
+    const Users users = serverOptions.users;
+    server_ = StartServer(std::move(serverOptions));
+    server_->SetNegotiationScript(options_.negotiation);
+    if (options_.misbehaves) {
+      server_->SetMisbehavior(options_.misbehavior);
+    }
+    commands_.emplace(*server_, users, options_.server.assertion, std::move(revocations));
+  }
+
+  const Options options_;
+  EndWait end_;
+  Descriptor log_;
+  LineOutput requestLines_;
+  std::optional<StateFolder> state_;
+  std::optional<ControlSocket> control_;
+  std::optional<StartedRealm> realm_;
+  std::unique_ptr<Server> server_;
+  std::optional<Commands> commands_;
+  std::optional<TemporaryFile> pidFile_;
+  std::optional<TemporaryFile> readyFile_;
+};
+
+}  // namespace
+
+void RunService(Options options, const std::function<void()>& ready) {
+  std::signal(SIGPIPE, SIG_IGN);
+  WarnLoudly(options);
+  Service service(std::move(options));
+  service.Announce(ready);
+  service.WaitForEnd();
+}
+
+}  // namespace DevSts::Program

@@ -1,0 +1,254 @@
+#include <string>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <openssl/x509_vfy.h>
+#include <poll.h>
+#include <signal.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include "devsts/xml_security.h"
+#include "help_texts.h"
+#include "program_process.h"
+#include "raw_client.h"
+#include "request_text.h"
+
+namespace DevSts::Testing {
+namespace {
+
+using testing::AllOf;
+using testing::HasSubstr;
+using testing::Not;
+using testing::StartsWith;
+
+std::string AskAt(const std::string& url, const std::string& envelope = AliceEnvelope()) {
+  RawClient client(PortIn(url));
+  client.Send(PostOf(envelope, kIssueAction));
+  return client.ReadAnswer();
+}
+
+// Runs the control client.
+std::string Control(const std::string& path, std::vector<std::string> command) {
+  command.insert(command.begin(), {"control", path});
+  const ProgramResult result = RunProgram(command);
+  return std::to_string(result.status) + " " + result.output + result.errors;
+}
+
+// Waits for the end of a process that is not a child; closes its descriptor.
+void AwaitEnd(int processDescriptor) {
+  pollfd entry{processDescriptor, POLLIN, 0};
+  EXPECT_EQ(poll(&entry, 1, 30'000), 1) << "The process still runs";
+  close(processDescriptor);
+}
+
+TEST(ProgramTest, SaysWhenItIsReadyAndEndsOnSignals) {
+  for (const int signal : {SIGTERM, SIGINT}) {
+    ProgramProcess program({});
+    program.AwaitReady();
+    EXPECT_THAT(program.Output(), StartsWith("http_url=http://127.0.0.1:"));
+    EXPECT_THAT(AskAt(program.Value("http_url")), StartsWith("HTTP/1.1 200 "));
+    EXPECT_THAT(program.ReadLine(), AllOf(StartsWith("request connection=1 "),
+                                          HasSubstr(" status=200"), Not(HasSubstr("secret"))));
+    program.Signal(signal);
+    EXPECT_EQ(program.WaitForEnd(), 0);
+    EXPECT_THAT(program.Errors(), HasSubstr("FOR TESTS ONLY"));
+  }
+}
+
+TEST(ProgramTest, ExecutesCommandsFromStandardInputUntilItEnds) {
+  ProgramProcess program({"--end-with-stdin"});
+  program.AwaitReady();
+  program.SendInput("revoke _1\nstall\nresume\n");
+  EXPECT_EQ(program.ReadLine(), "error no such token: _1");
+  EXPECT_EQ(program.ReadLine(), "ok stalled");
+  EXPECT_EQ(program.ReadLine(), "ok resumed");
+  program.CloseInput();
+  EXPECT_EQ(program.WaitForEnd(), 0);
+}
+
+TEST(ProgramTest, RunsInTheBackgroundUntilACommandEndsIt) {
+  const ScratchFolder scratch;
+  const std::string control = scratch / "control";
+  const ProgramResult started =
+      RunProgram({"--background", "--control", control, "--ready-file", scratch / "ready",
+                  "--pid-file", scratch / "pid", "--log", scratch / "log"});
+  ASSERT_EQ(started.status, 0) << started.errors;
+  EXPECT_EQ(started.output, TextOfFile(scratch / "ready") + "ready\n");
+  const pid_t process = static_cast<pid_t>(std::stol(TextOfFile(scratch / "pid")));
+  const int end = static_cast<int>(syscall(SYS_pidfd_open, process, 0));
+  ASSERT_GE(end, 0);
+  const std::string ready = TextOfFile(scratch / "ready");
+  const std::string url = ready.substr(9, ready.find('\n') - 9);
+  EXPECT_THAT(AskAt(url), StartsWith("HTTP/1.1 200 "));
+  EXPECT_EQ(Control(control, {"requests"}), "0 requests=1\n");
+  EXPECT_EQ(Control(control, {"misbehave", "next", "1", "fault-text=two words"}),
+            "0 misbehaving next 1\n");
+  EXPECT_EQ(ElementText(AskAt(url), "faultstring"), "two words");
+  EXPECT_EQ(Control(control, {"sing"}), "1 ssoclient-devsts: unknown command: sing\n");
+  EXPECT_THAT(TextOfFile(scratch / "log"),
+              AllOf(StartsWith("request connection="), HasSubstr(" fault=two words\n")));
+  EXPECT_EQ(Control(control, {"quit"}), "0 quitting\n");
+  AwaitEnd(end);
+  EXPECT_FALSE(FileExists(scratch / "ready") || FileExists(scratch / "pid") || FileExists(control));
+  EXPECT_THAT(Control(control, {"quit"}), AllOf(StartsWith("1 "), HasSubstr("no service listens")));
+}
+
+TEST(ProgramTest, ABackgroundStartThatFailsHasItsStatus) {
+  const ScratchFolder scratch;
+  const ProgramResult result = RunProgram({"--background", "--out", "/dev/null/out"});
+  EXPECT_EQ(result.status, 4);
+  EXPECT_THAT(result.errors, HasSubstr("/dev/null/out"));
+}
+
+TEST(ProgramTest, LeavesFilesThatAnotherServiceHasReplaced) {
+  const ScratchFolder scratch;
+  ProgramProcess program({"--pid-file", scratch / "pid"});
+  program.AwaitReady();
+  WriteTextTo(scratch / "pid", "another\n");
+  program.Signal(SIGTERM);
+  EXPECT_EQ(program.WaitForEnd(), 0);
+  EXPECT_EQ(TextOfFile(scratch / "pid"), "another\n");
+}
+
+TEST(ProgramTest, PrintsNoRequestsWhenQuiet) {
+  ProgramProcess program({"--quiet"});
+  program.AwaitReady();
+  AskAt(program.Value("http_url"));
+  program.Signal(SIGTERM);
+  EXPECT_EQ(program.WaitForEnd(), 0);
+  EXPECT_THAT(program.Output(), Not(HasSubstr("request ")));
+}
+
+TEST(ProgramTest, KeepsItsKeysInAFolderThatOneProcessUses) {
+  const ScratchFolder scratch;
+  const std::string state = scratch / "state";
+  std::string authority;
+  for (int start = 0; start < 2; ++start) {
+    ProgramProcess program({"--state", state, "--tls", "tls12-only"});
+    program.AwaitReady();
+    const std::string found = TextOfFile(state + "/ca.pem");
+    EXPECT_TRUE(start == 0 || found == authority);
+    authority = found;
+    RawClient client(PortIn(program.Value("https_url")));
+    EXPECT_EQ(client.StartTls(authority), X509_V_OK);
+    client.Send(PostOf(AliceEnvelope(), kIssueAction));
+    EXPECT_TRUE(VerifyXml(AssertionIn(client.ReadAnswer()), TextOfFile(state + "/signing.pem")));
+    const ProgramResult second = RunProgram({"--state", state});
+    EXPECT_EQ(second.status, 4);
+    EXPECT_THAT(second.errors, HasSubstr("another process uses this folder"));
+    program.Signal(SIGTERM);
+    EXPECT_EQ(program.WaitForEnd(), 0);
+  }
+  WriteTextTo(state + "/signing.pem", "broken");
+  const ProgramResult broken = RunProgram({"--state", state});
+  EXPECT_EQ(broken.status, 4);
+  EXPECT_THAT(broken.errors, HasSubstr("signing.pem"));
+}
+
+TEST(ProgramTest, ReadsUsersAndPrincipalsFromAFile) {
+  const ScratchFolder scratch;
+  WriteTextTo(scratch / "accounts",
+              "[user carol@EXAMPLE.COM]\npassword = pass word\n"
+              "group = EXAMPLE\\pilots\nclient-certificate = yes\n");
+  ProgramProcess program({"--accounts", scratch / "accounts", "--issuer", "urn:issuer"});
+  program.AwaitReady();
+  const std::string url = program.Value("http_url");
+  const std::string answer = AskAt(url, IssueEnvelope("carol@EXAMPLE.COM", "pass word"));
+  EXPECT_THAT(answer, AllOf(HasSubstr("EXAMPLE\\pilots"), HasSubstr(">urn:issuer<")));
+  EXPECT_THAT(AskAt(url), HasSubstr("Invalid credentials")) << "alice is not in the file";
+}
+
+TEST(ProgramTest, MisbehavesFromTheStart) {
+  ProgramProcess program({"--misbehave", "fault=wst:RequestFailed", "--misbehave=fault-text=later",
+                          "--tls", "expired"});
+  program.AwaitReady();
+  EXPECT_EQ(ElementText(AskAt(program.Value("http_url")), "faultstring"), "later");
+}
+
+TEST(ProgramTest, SignsWithTheNamedKeyAndForm) {
+  const ScratchFolder scratch;
+  ProgramProcess program({"--assertion", "signing-key=ec-p256", "--assertion",
+                          "signature=ecdsa-sha256", "--out", scratch / "out"});
+  program.AwaitReady();
+  const std::string answer = AskAt(program.Value("http_url"));
+  EXPECT_THAT(answer, HasSubstr("ecdsa-sha256"));
+  EXPECT_TRUE(VerifyXml(AssertionIn(answer), TextOfFile(scratch / "out/signing.pem")));
+}
+
+struct WrongStart {
+  const char* name;
+  std::vector<std::string> arguments;
+  int status;
+  const char* message;
+};
+
+class WrongStartTest : public testing::TestWithParam<WrongStart> {};
+
+TEST_P(WrongStartTest, EndsWithAStatusOfItsKind) {
+  const ProgramResult result = RunProgram(GetParam().arguments);
+  EXPECT_EQ(result.status, GetParam().status);
+  EXPECT_THAT(result.errors, HasSubstr(GetParam().message));
+  EXPECT_EQ(result.output, "");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Each, WrongStartTest,
+    testing::Values(
+        WrongStart{"UnknownOption", {"--sing"}, 2, "--sing"},
+        WrongStart{"NoValue", {"--state"}, 2, "--state"},
+        WrongStart{"Port", {"--http-port", "65536"}, 2, "--http-port"},
+        WrongStart{"Exposed", {"--address", "0.0.0.0"}, 2, "--expose-to-network"},
+        WrongStart{"Address", {"--address", "localhost"}, 2, "not a numeric address"},
+        WrongStart{"Misbehaviour", {"--misbehave", "sing"}, 2, "--misbehave: there is no name"},
+        WrongStart{"Tls", {"--tls", "sing"}, 2, "--tls: there is no name"},
+        WrongStart{"Assertion", {"--assertion", "indent"}, 2, "--assertion: indent needs a value"},
+        WrongStart{"Key", {"--assertion", "signing-key=ec-p256"}, 2, "needs an RSA key"},
+        WrongStart{"Negotiation", {"--negotiation", "request-mic=1"}, 2, "has no value"},
+        WrongStart{"Principal", {"--principal", "alice"}, 2, "NAME=USER"},
+        WrongStart{"RealmAndKeytab", {"--realm", "--keytab", "any"}, 2, "excludes"},
+        WrongStart{"KeytabsWithoutRealm", {"--user-keytabs", "any"}, 2, "need a realm"},
+        WrongStart{"BackgroundWithInput", {"--background", "--end-with-stdin"}, 2, "excludes"},
+        WrongStart{"ControlWithoutCommand", {"control", "path"}, 2, "usage: "},
+        WrongStart{"Accounts", {"--accounts", "/nonexistent"}, 4, "/nonexistent: cannot be read"},
+        WrongStart{"Log", {"--log", "/nonexistent/log"}, 4, "/nonexistent/log"},
+        WrongStart{"State", {"--state", "/dev/null"}, 4, "/dev/null"},
+        WrongStart{"Keytab", {"--keytab", "/nonexistent"}, 4, "the keytab cannot be read"},
+        WrongStart{"Control", {"--control", "/nonexistent/control"}, 4, "/nonexistent/control"},
+        WrongStart{"ForeignAddress",
+                   {"--address", "203.0.113.1", "--expose-to-network"},
+                   3,
+                   "WARNING: listening on 203.0.113.1"}),
+    [](const auto& test) { return std::string(test.param.name); });
+
+TEST(ProgramTest, ReportsAPortThatIsInUse) {
+  ProgramProcess program({});
+  program.AwaitReady();
+  const ProgramResult second =
+      RunProgram({"--http-port", std::to_string(PortIn(program.Value("http_url")))});
+  EXPECT_EQ(second.status, 3);
+  EXPECT_THAT(second.errors, HasSubstr("a port cannot be opened: bind: Address already in use"));
+}
+
+TEST(ProgramTest, ReportsAWrongLineOfTheAccounts) {
+  const ScratchFolder scratch;
+  WriteTextTo(scratch / "accounts", "[user a@B]\npasword = x\n");
+  const ProgramResult result = RunProgram({"--accounts", scratch / "accounts"});
+  EXPECT_EQ(result.status, 2);
+  EXPECT_THAT(result.errors, HasSubstr((scratch / "accounts") + ":2: there is no key 'pasword'"));
+}
+
+TEST(ProgramTest, HelpBeginsWithAnExample) {
+  const ProgramResult help = RunProgram({"--help"});
+  EXPECT_EQ(help.status, 0);
+  EXPECT_THAT(help.output, StartsWith("Example:\n  ssoclient-devsts --background "));
+  EXPECT_THAT(help.output, HasSubstr("FOR TESTS ONLY"));
+  EXPECT_EQ(RunProgram({"--help-misbehaviour"}).output, Program::MisbehaviorHelp());
+  EXPECT_EQ(RunProgram({"control", "--help"}).output, Program::ControlHelp());
+  EXPECT_EQ(RunProgram({"--help-accounts"}).output, Program::AccountsHelp());
+  EXPECT_THAT(RunProgram({"--version"}).output, StartsWith("ssoclient-devsts 1."));
+}
+
+}  // namespace
+}  // namespace DevSts::Testing
