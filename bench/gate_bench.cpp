@@ -24,13 +24,13 @@
 #include <ssoclient/access/token_gate.h>
 
 #include "allocation_count.h"
+#include "sample_gate.h"
 #include "sample_token.h"
 
 namespace Bench {
 namespace {
 
 using Clock = std::chrono::steady_clock;
-using SsoClient::Access::Presenter;
 using SsoClient::Access::TokenGate;
 
 constexpr int kRounds = 200;
@@ -38,33 +38,10 @@ constexpr std::size_t kMisses = 40;
 constexpr std::size_t kHits = 400;
 constexpr std::size_t kThreadSize = 6000;
 
-std::shared_ptr<TokenGate> MakeGate(const SampleToken& sample, std::size_t cachedTokens) {
-  SsoClient::Access::TrustedIssuer issuer;
-  issuer.isForAnyIssuer = true;
-  issuer.certificates = Tarnik::Crypto::CreateCertificatesFromPem(sample.certificatePem);
-  SsoClient::Access::TrustStoreConfig trust;
-  trust.issuers = {issuer};
-  trust.isWatching = false;
-  SsoClient::Access::GateConfig config;
-  config.trust = SsoClient::Access::CreateTrustStore(trust);
-  config.audiences = {"https://service.example.com"};
-  config.acceptsUnrestrictedTokens = true;
-  config.bearerTokens = SsoClient::Access::BearerTokens::kAccept;
-  config.largestToken = std::size_t{1} << 20U;
-  config.cache.tokens = cachedTokens;
-  return SsoClient::Access::CreateTokenGate(config);
-}
-
-void CheckOnce(const TokenGate& gate, const std::string& xml) {
-  if (!gate.Check(xml, Presenter::Nobody()).IsAccepted()) {
-    throw std::runtime_error("The sample token is refused.");
-  }
-}
-
 double NanosecondsPerCheck(const TokenGate& gate, const std::string& xml, std::size_t checks) {
   const auto begin = Clock::now();
   for (std::size_t i = 0; i < checks; ++i) {
-    CheckOnce(gate, xml);
+    CheckAccepted(gate, xml);
   }
   return std::chrono::duration<double, std::nano>(Clock::now() - begin).count() /
          static_cast<double>(checks);
@@ -76,12 +53,12 @@ class Kind {
   explicit Kind(std::size_t size)
       : size_(size),
         sample_(GetSampleToken(size)),
-        missing_(MakeGate(sample_, 0)),
-        hitting_(MakeGate(sample_, 1000)) {}
+        missing_(MakeSampleGate(sample_, 0)),
+        hitting_(MakeSampleGate(sample_, 1000)) {}
 
   void Measure() {
     miss_ = std::min(miss_, NanosecondsPerCheck(*missing_, sample_.xml, kMisses));
-    CheckOnce(*hitting_, sample_.xml);
+    CheckAccepted(*hitting_, sample_.xml);
     const std::size_t before = CountAllocations();
     hit_ = std::min(hit_, NanosecondsPerCheck(*hitting_, sample_.xml, kHits));
     allocations_ = (CountAllocations() - before + kHits - 1) / kHits;
@@ -114,11 +91,11 @@ void PrintMemory(std::size_t size) {
   for (std::size_t i = 0; i < kTokens; ++i) {
     texts.push_back(sample.xml + std::string(i, ' '));
   }
-  const auto gate = MakeGate(sample, 1000);
-  CheckOnce(*MakeGate(sample, 0), sample.xml);
+  const auto gate = MakeSampleGate(sample, 1000);
+  CheckAccepted(*MakeSampleGate(sample, 0), sample.xml);
   const std::size_t before = HeapInUse();
   for (const std::string& text : texts) {
-    CheckOnce(*gate, text);
+    CheckAccepted(*gate, text);
   }
   const std::size_t used = HeapInUse() - before;
   const SsoClient::Access::GateMetrics metrics = gate->Metrics();
@@ -132,7 +109,7 @@ double NanosecondsPerHitOfTwo(const TokenGate& gate, const std::string& first,
   std::barrier ready(2);
   std::array<double, 2> times{};
   const auto run = [&](std::size_t index, const std::string& xml) {
-    CheckOnce(gate, xml);
+    CheckAccepted(gate, xml);
     ready.arrive_and_wait();
     times[index] = NanosecondsPerCheck(gate, xml, kHits);
   };
@@ -144,13 +121,13 @@ double NanosecondsPerHitOfTwo(const TokenGate& gate, const std::string& first,
 
 void PrintThreads() {
   const SampleToken& sample = GetSampleToken(kThreadSize);
-  const auto gate = MakeGate(sample, 10'000);
+  const auto gate = MakeSampleGate(sample, 10'000);
   const std::string other = sample.xml + " ";
   double one = std::numeric_limits<double>::max();
   double two = one;
   double same = one;
   for (int round = 0; round < kRounds; ++round) {
-    CheckOnce(*gate, sample.xml);
+    CheckAccepted(*gate, sample.xml);
     one = std::min(one, NanosecondsPerCheck(*gate, sample.xml, kHits));
     two = std::min(two, NanosecondsPerHitOfTwo(*gate, sample.xml, other));
     same = std::min(same, NanosecondsPerHitOfTwo(*gate, sample.xml, sample.xml));
