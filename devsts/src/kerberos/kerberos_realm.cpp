@@ -23,7 +23,7 @@ using namespace std::chrono_literals;
 
 constexpr char kMasterPassword[] = "not-a-secret";
 constexpr int kAttempts = 5;
-constexpr auto kPatience = 30s;
+constexpr auto kStartPatience = 30s;
 
 std::string CreateFolder() {
   std::string pattern = std::filesystem::temp_directory_path() / "devsts-realm-XXXXXX";
@@ -135,7 +135,7 @@ class KerberosRealm::State {
     WriteConfiguration(port);
     kdc.emplace(Command{
         {"/usr/sbin/krb5kdc", "-n", "-r", kName}, Variables(), folder + "/krb5kdc.log", {}});
-    const auto limit = std::chrono::steady_clock::now() + kPatience;
+    const auto limit = std::chrono::steady_clock::now() + kStartPatience;
     while (kdc->IsRunning() && std::chrono::steady_clock::now() < limit) {
       if (IsListening(port)) {
         return true;
