@@ -14,8 +14,12 @@
 namespace DevSts {
 namespace {
 
+// Long enough that clients do not warn that a certificate expires soon.
+constexpr std::chrono::hours kCertificateLifetime{90 * 24};
+
 Credential MakeAuthority() {
   CertificateSpec spec;
+  spec.notAfter = kCertificateLifetime;
   spec.commonName = "Dev STS CA";
   spec.isAuthority = true;
   spec.freshKey = true;  // clients of one server do not trust another's certificate
@@ -24,6 +28,7 @@ Credential MakeAuthority() {
 
 Credential MakeSigner(KeyType keyType, bool freshKey) {
   CertificateSpec spec;
+  spec.notAfter = kCertificateLifetime;
   spec.commonName = "Dev STS signing";
   spec.keyType = keyType;
   spec.freshKey = freshKey;
@@ -137,6 +142,7 @@ Credential Server::StrangerCredential() const {
 
 Credential Server::MakeClientCredential(const std::string& commonName) const {
   CertificateSpec spec;
+  spec.notAfter = kCertificateLifetime;
   spec.commonName = commonName;
   spec.keyType = KeyType::Rsa2048;
   return MakeCertificate(spec, &impl_->authority);

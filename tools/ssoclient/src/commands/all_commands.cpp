@@ -1,9 +1,10 @@
-#include "commands/command.h"
+#include "commands/commands.h"
 
 namespace SsoClient::Tool {
 
 std::vector<std::unique_ptr<Command>> MakeCommands() {
   std::vector<std::unique_ptr<Command>> all;
+  all.push_back(MakeDoctorCommand());
   return all;
 }
 
