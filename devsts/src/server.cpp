@@ -16,6 +16,9 @@
 namespace DevSts {
 namespace {
 
+// Long enough that clients do not warn that a certificate expires soon.
+constexpr std::chrono::hours kCertificateLifetime{90 * 24};
+
 bool IsGiven(const Credential& credential) {
   return !credential.certificatePem.empty();
 }
@@ -25,6 +28,7 @@ Credential AuthorityOf(const ServerOptions& options) {
     return options.keys.authority;
   }
   CertificateSpec spec;
+  spec.notAfter = kCertificateLifetime;
   spec.commonName = "Dev STS CA";
   spec.isAuthority = true;
   spec.freshKey = true;  // clients of one server do not trust another's certificate
@@ -33,6 +37,7 @@ Credential AuthorityOf(const ServerOptions& options) {
 
 Credential MakeSigner(KeyType keyType, bool freshKey) {
   CertificateSpec spec;
+  spec.notAfter = kCertificateLifetime;
   spec.commonName = "Dev STS signing";
   spec.keyType = keyType;
   spec.freshKey = freshKey;
@@ -179,6 +184,7 @@ Credential Server::StrangerCredential() const {
 
 Credential Server::MakeClientCredential(const std::string& commonName) const {
   CertificateSpec spec;
+  spec.notAfter = kCertificateLifetime;
   spec.commonName = commonName;
   spec.keyType = KeyType::Rsa2048;
   return MakeCertificate(spec, &impl_->authority);

@@ -6,10 +6,13 @@ namespace DevSts {
 namespace {
 
 constexpr std::chrono::hours kDay{24};
+// Long enough that clients do not warn that it ends soon.
+constexpr std::chrono::hours kLifetime = 90 * kDay;
 
 Credential MakeIntermediate(const Credential& authority) {
   CertificateSpec spec;
   spec.commonName = "Dev STS intermediate CA";
+  spec.notAfter = kLifetime;
   spec.isAuthority = true;
   return MakeCertificate(spec, &authority);
 }
@@ -17,6 +20,7 @@ Credential MakeIntermediate(const Credential& authority) {
 CertificateSpec SpecFor(const TlsOptions& options) {
   CertificateSpec spec;
   spec.commonName = "Dev STS server";
+  spec.notAfter = kLifetime;
   spec.dnsNames = {"localhost"};
   spec.addresses = {"127.0.0.1", "::1"};
   switch (options.certificate) {

@@ -10,6 +10,7 @@ std::vector<std::unique_ptr<Command>> MakeCommands() {
   all.push_back(MakeExchangeCommand());
   all.push_back(MakeShowCommand());
   all.push_back(MakeVerifyCommand());
+  all.push_back(MakeDoctorCommand());
   return all;
 }
 

@@ -13,6 +13,7 @@ std::unique_ptr<Command> MakeValidateCommand();
 std::unique_ptr<Command> MakeExchangeCommand();
 std::unique_ptr<Command> MakeShowCommand();
 std::unique_ptr<Command> MakeVerifyCommand();
+std::unique_ptr<Command> MakeDoctorCommand();
 
 }  // namespace SsoClient::Tool
 

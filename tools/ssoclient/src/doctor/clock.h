@@ -1,0 +1,37 @@
+#ifndef SSOCLIENT_TOOL_DOCTOR_CLOCK_H
+#define SSOCLIENT_TOOL_DOCTOR_CLOCK_H
+
+#include <optional>
+#include <string>
+
+#include "doctor/report.h"
+
+namespace SsoClient::Tool::Doctor {
+
+/// By how much the clock of the service is ahead of this machine's.
+struct ClockOffset {
+  double seconds = 0;
+  /// The true offset differs by at most this: half of the round trip, and half of the second that
+  /// the Date does not divide.
+  double uncertainty = 0;
+};
+
+/// The Unix time of a Date in the preferred form (RFC 9110, section 5.6.7); nothing for any other.
+std::optional<long> ParseHttpDate(const std::string& text);
+
+/// The offset when a request sent at `sentAt` and answered at `receivedAt`, both in microseconds of
+/// Unix time on this machine, has the Date `serviceTime` in seconds of Unix time.
+ClockOffset OffsetOf(long serviceTime, long sentAt, long receivedAt);
+
+/// More than this is a warning: services tolerate about a minute between the Created of a request
+/// and their own time.
+inline constexpr double kRequestTolerance = 60;
+/// More than this is a failure: the library tolerates 600 s when it checks the validity of a token.
+inline constexpr double kTokenTolerance = 600;
+
+/// What the offset means.
+Finding JudgeClock(const ClockOffset& offset);
+
+}  // namespace SsoClient::Tool::Doctor
+
+#endif

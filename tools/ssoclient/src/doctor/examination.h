@@ -1,0 +1,98 @@
+#ifndef SSOCLIENT_TOOL_DOCTOR_EXAMINATION_H
+#define SSOCLIENT_TOOL_DOCTOR_EXAMINATION_H
+
+#include <chrono>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include <ssoclient/holder_of_key_config.h>
+#include <ssoclient/saml_token.h>
+#include <tarnik/core/ref.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/ssl/ssl_context.h>
+
+#include "doctor/address.h"
+#include "doctor/report.h"
+#include "doctor/time_limit.h"
+#include "doctor/tls_probe.h"
+#include "input/secret_text.h"
+
+namespace SsoClient::Tool::Doctor {
+
+enum class LoginKind { kNone, kPassword, kCertificate, kKerberos };
+
+/// What the user asked for.
+struct Plan {
+  std::string url{};
+  std::string peerName{};
+  std::vector<std::string> caFiles{};
+  std::vector<std::string> crlFiles{};
+  std::string stsCertificateFile{};
+  std::string user{};
+  std::string certificateFile{};
+  std::string keyFile{};
+  std::string kerberosService{};
+  std::string principal{};
+  std::string keytab{};
+  std::chrono::milliseconds timeout{30000};
+  LoginKind login = LoginKind::kNone;
+  /// The TLS trust of the options. Throws an exception when it cannot be made.
+  std::function<Tarnik::Ref<Tarnik::Ssl::SSLContext>()> makeSslContext{};
+  /// The password, and the passphrase of the key. May ask the user; throw `ToolException`.
+  std::function<SecretText()> readPassword{};
+  std::function<SecretText()> readPassphrase{};
+};
+
+/// The parts of the URL.
+struct Target {
+  std::string host{};
+  std::string path{};
+  int port = 0;
+  bool isHttps = false;
+};
+
+/// The answer to the harmless request.
+struct HttpAnswer {
+  std::string reason{};
+  std::string contentType{};
+  std::string location{};
+  std::string server{};
+  std::string body{};
+  std::optional<std::string> date{};
+  /// Unix time in microseconds on this machine before and after the exchange.
+  long sentAt = 0;
+  long receivedAt = 0;
+  int status = 0;
+};
+
+/// What the steps have found out for those after them.
+struct Examination {
+  explicit Examination(const Plan& thePlan) : plan(thePlan), limit(thePlan.timeout) {}
+
+  const Plan& plan;
+  TimeLimit limit;
+  Target target{};
+  Tarnik::Ref<Tarnik::Ssl::SSLContext> sslContext{};
+  std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>> signers{};
+  std::optional<HolderOfKeyConfig> identity{};
+  std::vector<Address> addresses{};
+  /// The first address that accepts connections.
+  Address reachable{};
+  TlsAttempt tls{};
+  std::optional<HttpAnswer> answer{};
+  std::shared_ptr<const SamlToken> token{};
+  /// How far the clock of the service is ahead of this machine's, in seconds; 0 if unknown.
+  double clockOffset = 0;
+
+  /// The name that the certificate of the service must have.
+  const std::string& ExpectedName() const {
+    return plan.peerName.empty() ? target.host : plan.peerName;
+  }
+};
+
+}  // namespace SsoClient::Tool::Doctor
+
+#endif

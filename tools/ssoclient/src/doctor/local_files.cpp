@@ -1,0 +1,77 @@
+#include "doctor/local_files.h"
+
+#include <cerrno>
+#include <system_error>
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace SsoClient::Tool::Doctor {
+namespace {
+
+constexpr long kMicrosecondsOfDay = 24L * 3600 * 1000000;
+
+std::string Quoted(const std::string& path) {
+  return "'" + path + "'";
+}
+
+}  // namespace
+
+std::optional<Finding> FileProblem(const std::string& path) {
+  struct stat status {};
+  if (stat(path.c_str(), &status) != 0) {
+    return Failure(ExitStatus::kLocal, "file-missing",
+                   Quoted(path) + ": " + std::system_category().message(errno),
+                   "check the path of the option");
+  }
+  if (S_ISDIR(status.st_mode)) {
+    return Failure(ExitStatus::kLocal, "file-missing", Quoted(path) + " is a folder",
+                   "name a file");
+  }
+  if (access(path.c_str(), R_OK) != 0) {
+    return Failure(ExitStatus::kLocal, "file-unreadable",
+                   Quoted(path) + ": " + std::system_category().message(errno),
+                   "let this user read the file");
+  }
+  return std::nullopt;
+}
+
+std::optional<Finding> PermissionProblem(const std::string& path) {
+  struct stat status {};
+  if (stat(path.c_str(), &status) != 0 || (status.st_mode & (S_IRGRP | S_IROTH)) == 0) {
+    return std::nullopt;
+  }
+  return Warning(ExitStatus::kLocal, "key-readable-by-others",
+                 "the group or others may read " + Quoted(path) + ", which contains a key",
+                 "chmod 600 " + path);
+}
+
+std::optional<Finding> ValidityProblem(const std::string& what,
+                                       const Tarnik::Crypto::Certificate& certificate,
+                                       const Tarnik::System::DateTime& now) {
+  if (certificate.NotAfter() <= now) {
+    return Failure(ExitStatus::kLocal, "local-certificate-expired",
+                   what + " has expired on " + certificate.NotAfter().ToString(),
+                   "use a newer certificate");
+  }
+  if (certificate.NotBefore() > now) {
+    return Failure(ExitStatus::kLocal, "local-certificate-not-yet-valid",
+                   what + " is valid only from " + certificate.NotBefore().ToString() +
+                       "; it is now " + now.ToString(),
+                   "check the clock of this machine, or wait");
+  }
+  if (const long days = DaysUntil(certificate.NotAfter(), now); days < kSoonDays) {
+    return Warning(ExitStatus::kLocal, "local-certificate-expires-soon",
+                   what + " expires in " + std::to_string(days) + " days, on " +
+                       certificate.NotAfter().ToString(),
+                   "have it renewed");
+  }
+  return std::nullopt;
+}
+
+long DaysUntil(const Tarnik::System::DateTime& then, const Tarnik::System::DateTime& now) {
+  const long left = then.GetUtcTime() - now.GetUtcTime();
+  return left >= 0 ? left / kMicrosecondsOfDay : -1;
+}
+
+}  // namespace SsoClient::Tool::Doctor

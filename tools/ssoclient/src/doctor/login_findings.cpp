@@ -1,0 +1,69 @@
+#include "doctor/login_findings.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/crypto_exception.h>
+
+#include "failure.h"
+
+namespace SsoClient::Tool::Doctor {
+namespace {
+
+std::string Names(const std::vector<ClaimedSigner>& signers) {
+  std::string names;
+  for (const ClaimedSigner& signer : signers) {
+    names += (names.empty() ? "" : "; ") + signer.subject + " (SHA-256 " + signer.fingerprint + ")";
+  }
+  return names.empty() ? "a key that it does not name by a certificate" : names;
+}
+
+Finding OtherSigner(const std::vector<ClaimedSigner>& signers, const std::string& trusted) {
+  return Failure(ExitStatus::kUnreachable, "signer-mismatch",
+                 "the token was not accepted: it is signed with " + Names(signers) +
+                     ", and --sts-certificate has " + trusted,
+                 "get the current signing certificate of the service from a trusted source, and "
+                 "give it as --sts-certificate");
+}
+
+}  // namespace
+
+Finding JudgeLoginFailure(const std::exception& failure, const std::vector<ClaimedSigner>& signers,
+                          const std::string& trusted, bool isKerberos) {
+  const std::string message = failure.what();
+  if (isKerberos) {
+    return Failure(ExitStatus::kLocal, "kerberos-failed", "no Kerberos login: " + message,
+                   "get tickets with kinit, or give --keytab; check the name of --service");
+  }
+  if (dynamic_cast<const PasswordExpiredException*>(&failure) != nullptr) {
+    return Failure(ExitStatus::kRefused, "password-expired", message,
+                   "set a new password at the service");
+  }
+  if (dynamic_cast<const InvalidCredentialsException*>(&failure) != nullptr) {
+    return Failure(ExitStatus::kRefused, "login-refused", message,
+                   "check the user name, the password or the certificate, and whether the account "
+                   "is locked");
+  }
+  if (dynamic_cast<const InvalidSignatureException*>(&failure) != nullptr) {
+    return OtherSigner(signers, trusted);
+  }
+  if (dynamic_cast<const InvalidTokenException*>(&failure) != nullptr) {
+    return Failure(ExitStatus::kUnreachable, "token-rejected",
+                   "the service issued a token that is not accepted: " + message,
+                   "compare the clocks, and look into the log of the service");
+  }
+  if (dynamic_cast<const CommunicationException*>(&failure) != nullptr) {
+    return Failure(ExitStatus::kUnreachable, "login-unanswered",
+                   "the exchange of the login failed: " + message,
+                   "allow more time with --timeout, and look into the log of the service");
+  }
+  if (dynamic_cast<const SsoException*>(&failure) != nullptr) {
+    return Failure(ExitStatus::kRefused, "login-fault",
+                   "the service refuses the request: " + message,
+                   "look into the log of the service");
+  }
+  const Tool::Failure other = FailureOf(failure);
+  const bool isOwn = dynamic_cast<const ToolException*>(&failure) != nullptr;
+  return Failure(other.status, isOwn ? other.kind : "login-failed", other.message, other.remedy);
+}
+
+}  // namespace SsoClient::Tool::Doctor

@@ -1,0 +1,83 @@
+#include <algorithm>
+#include <array>
+#include <cstdio>
+#include <ostream>
+
+#include <tarnik/text/display_text.h>
+
+#include "doctor/render.h"
+
+namespace SsoClient::Tool::Doctor {
+namespace {
+
+Colour ColourOf(StepOutcome outcome) {
+  switch (outcome) {
+    case StepOutcome::kOk:
+      return Colour::kGood;
+    case StepOutcome::kWarning:
+      return Colour::kWarning;
+    case StepOutcome::kFailed:
+      return Colour::kBad;
+    case StepOutcome::kSkipped:
+      break;
+  }
+  return Colour::kFaint;
+}
+
+// Texts may contain file names.
+std::string Shown(const std::string& text) {
+  constexpr std::size_t kLongest = 4000;
+  return Tarnik::ToDisplayText(text, kLongest);
+}
+
+std::string Padded(std::string text, std::size_t width) {
+  text.resize(std::max(text.size(), width), ' ');
+  return text;
+}
+
+std::string DurationText(const Step& step) {
+  if (step.finding.outcome == StepOutcome::kSkipped) {
+    return std::string(9, ' ');
+  }
+  std::array<char, 32> text{};
+  std::snprintf(text.data(), text.size(), "%6.0f ms",
+                static_cast<double>(step.duration.count()) / 1000);
+  return text.data();
+}
+
+void PrintStep(const Console& console, const Step& step) {
+  const Finding& finding = step.finding;
+  const bool isProblem =
+      finding.outcome == StepOutcome::kFailed || finding.outcome == StepOutcome::kWarning;
+  console.out << console.Paint(ColourOf(finding.outcome), Padded(NameOf(finding.outcome), 8))
+              << Padded(step.name, 12) << DurationText(step) << "  "
+              << (isProblem ? finding.name + ": " : "") << Shown(finding.message) << '\n';
+  for (const std::string& line : step.lines) {
+    console.out << std::string(10, ' ') << console.Paint(Colour::kFaint, Shown(line)) << '\n';
+  }
+  if (!finding.remedy.empty()) {
+    console.out << std::string(8, ' ') << "remedy: " << Shown(finding.remedy) << '\n';
+  }
+}
+
+}  // namespace
+
+void PrintReport(const Console& console, const Report& report) {
+  console.out << console.Paint(Colour::kStrong, Shown(report.url)) << '\n';
+  for (const Step& step : report.steps) {
+    PrintStep(console, step);
+  }
+  const Step* cause = FirstCause(report);
+  console.out << '\n';
+  if (cause == nullptr) {
+    console.out << console.Paint(Colour::kGood, "all is well") << '\n';
+    return;
+  }
+  const bool isFailure = cause->finding.outcome == StepOutcome::kFailed;
+  console.out << console.Paint(ColourOf(cause->finding.outcome),
+                               isFailure ? "first cause: " : "no failure; first warning: ")
+              << Shown(cause->finding.message) << '\n';
+  console.out << "remedy: " << Shown(cause->finding.remedy) << '\n';
+}
+
+}  // namespace SsoClient::Tool::Doctor

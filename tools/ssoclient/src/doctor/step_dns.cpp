@@ -1,0 +1,22 @@
+#include "doctor/dns_probe.h"
+#include "doctor/steps.h"
+
+namespace SsoClient::Tool::Doctor {
+
+Step ExamineDns(Examination& examination) {
+  Step step;
+  const Target& target = examination.target;
+  Resolution resolution =
+      ResolveUntil(ResolveBySystem, target.host, target.port, examination.limit.ForStep());
+  step.finding = JudgeResolution(target.host, resolution);
+  step.details["host"] = target.host;
+  step.details["addresses"] = nlohmann::json::array();
+  for (const Address& address : resolution.addresses) {
+    step.lines.push_back(address.text);
+    step.details["addresses"].push_back(address.text);
+  }
+  examination.addresses = std::move(resolution.addresses);
+  return step;
+}
+
+}  // namespace SsoClient::Tool::Doctor

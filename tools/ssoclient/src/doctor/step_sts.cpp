@@ -1,0 +1,12 @@
+#include "doctor/harmless_request.h"
+#include "doctor/steps.h"
+
+namespace SsoClient::Tool::Doctor {
+
+Step ExamineSts(Examination& examination) {
+  Step step;
+  step.finding = JudgeSoapAnswer(examination.answer->body);
+  return step;
+}
+
+}  // namespace SsoClient::Tool::Doctor

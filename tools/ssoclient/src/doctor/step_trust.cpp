@@ -1,0 +1,133 @@
+#include <exception>
+#include <vector>
+
+#include <tarnik/core/exception.h>
+#include <tarnik/crypto/certificate.h>
+#include <tarnik/crypto/revocation_list.h>
+
+#include "doctor/local_files.h"
+#include "doctor/steps.h"
+
+namespace SsoClient::Tool::Doctor {
+namespace {
+
+using Certificates = std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>>;
+
+void Show(Step& step, const std::string& what, const Certificates& certificates) {
+  for (const auto& certificate : certificates) {
+    step.lines.push_back(what + ": " + certificate->SubjectName() + ", valid until " +
+                         certificate->NotAfter().ToString());
+    step.details["certificates"].push_back(
+        {{"use", what},
+         {"subject", certificate->SubjectName()},
+         {"notBefore", certificate->NotBefore().ToString()},
+         {"notAfter", certificate->NotAfter().ToString()},
+         {"fingerprint", Tarnik::Crypto::FingerprintText(*certificate)}});
+  }
+}
+
+// Records the worst problem.
+void Note(Step& step, const std::optional<Finding>& problem) {
+  if (problem &&
+      (step.finding.outcome == StepOutcome::kOk || (step.finding.outcome == StepOutcome::kWarning &&
+                                                    problem->outcome == StepOutcome::kFailed))) {
+    step.finding = *problem;
+  }
+}
+
+Finding Unusable(const char* name, const std::string& path, const std::string& reason) {
+  return Failure(ExitStatus::kLocal, name, "'" + path + "': " + reason,
+                 "give a PEM file (DER is possible only for --sts-certificate)");
+}
+
+void ExamineCa(Step& step, const std::string& path, const Tarnik::System::DateTime& now) {
+  if (const auto problem = FileProblem(path)) {
+    Note(step, problem);
+    return;
+  }
+  try {
+    const Certificates certificates = Tarnik::Crypto::LoadCertificates(path);
+    Show(step, "ca", certificates);
+    for (const auto& certificate : certificates) {
+      // A bundle may contain old certificates, and the service's chain decides whether it matters.
+      auto problem = ValidityProblem("the CA " + certificate->SubjectName(), *certificate, now);
+      if (problem) {
+        problem->outcome = StepOutcome::kWarning;
+      }
+      Note(step, problem);
+    }
+  } catch (const Tarnik::Exception& unusable) {
+    Note(step, Unusable("bad-ca-file", path, unusable.what()));
+  }
+}
+
+void ExamineList(Step& step, const std::string& path) {
+  if (const auto problem = FileProblem(path)) {
+    Note(step, problem);
+    return;
+  }
+  try {
+    step.lines.push_back(
+        "revocation lists: " + std::to_string(Tarnik::Crypto::LoadRevocationLists(path).size()) +
+        " in '" + path + "'");
+  } catch (const Tarnik::Exception& unusable) {
+    Note(step, Unusable("bad-revocation-list", path, unusable.what()));
+  }
+}
+
+void ExamineSigners(Step& step, Examination& examination, const Tarnik::System::DateTime& now) {
+  const std::string& path = examination.plan.stsCertificateFile;
+  if (const auto problem = FileProblem(path)) {
+    Note(step, problem);
+    return;
+  }
+  try {
+    examination.signers = Tarnik::Crypto::LoadPemOrDerCertificates(path);
+    Show(step, "signer", examination.signers);
+    for (const auto& signer : examination.signers) {
+      auto problem =
+          ValidityProblem("the signing certificate " + signer->SubjectName(), *signer, now);
+      if (problem) {
+        problem->outcome = StepOutcome::kWarning;  // the library does not check its validity
+      }
+      Note(step, problem);
+    }
+  } catch (const Tarnik::Exception& unusable) {
+    Note(step, Unusable("bad-sts-certificate", path, unusable.what()));
+  }
+}
+
+}  // namespace
+
+Step ExamineTrust(Examination& examination) {
+  Step step;
+  const Plan& plan = examination.plan;
+  const Tarnik::System::DateTime now = Tarnik::System::GetUtcDateTime();
+  for (const std::string& path : plan.caFiles) {
+    ExamineCa(step, path, now);
+  }
+  for (const std::string& path : plan.crlFiles) {
+    ExamineList(step, path);
+  }
+  if (!plan.stsCertificateFile.empty()) {
+    ExamineSigners(step, examination, now);
+  }
+  if (step.finding.outcome == StepOutcome::kFailed) {
+    return step;
+  }
+  try {
+    examination.sslContext = plan.makeSslContext();
+  } catch (const std::exception& unusable) {
+    step.finding = Failure(ExitStatus::kLocal, "trust-unusable", unusable.what(),
+                           "check the files of --ca and --tls-crl");
+    return step;
+  }
+  if (step.finding.outcome == StepOutcome::kOk) {
+    step.finding.message = plan.caFiles.empty()
+                               ? "the CAs of this system are trusted"
+                               : std::to_string(plan.caFiles.size()) + " CA file(s) trusted";
+  }
+  return step;
+}
+
+}  // namespace SsoClient::Tool::Doctor

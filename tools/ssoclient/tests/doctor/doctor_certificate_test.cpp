@@ -1,0 +1,157 @@
+// Findings about the certificates of the service, each produced for real.
+#include <chrono>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "devsts/certificates.h"
+#include "devsts/server.h"
+#include "support/doctor_run.h"
+#include "support/peer.h"
+#include "support/temporary_file.h"
+
+namespace SsoClient::Tool::Testing {
+namespace {
+
+using DevSts::CertificateSpec;
+using DevSts::Credential;
+using DevSts::ServerCertificate;
+using Tarnik::Testing::TemporaryFile;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+constexpr std::chrono::hours kDay{24};
+
+Credential MakeCa(const std::string& name, bool freshKey = false,
+                  const Credential* issuer = nullptr) {
+  CertificateSpec spec;
+  spec.commonName = name;
+  spec.isAuthority = true;
+  spec.freshKey = freshKey;
+  spec.notAfter = 100 * kDay;
+  return DevSts::MakeCertificate(spec, issuer);
+}
+
+CertificateSpec ServerSpec() {
+  CertificateSpec spec;
+  spec.commonName = "service";
+  spec.addresses = {"127.0.0.1"};
+  spec.notAfter = 100 * kDay;
+  return spec;
+}
+
+// Examines a dev STS with such a certificate, trusting its CA.
+DoctorRun Examine(ServerCertificate certificate) {
+  DevSts::ServerOptions options;
+  options.tls.certificate = certificate;
+  const DevSts::Server sts(options);
+  const TemporaryFile ca(sts.CaCertificatePem());
+  return RunDoctor(sts.HttpsUrlFor("localhost"), {"--ca", ca.Path()});
+}
+
+// The same for a service that only speaks TLS.
+DoctorRun Examine(const Credential& server, const std::string& chain, const std::string& ca,
+                  const std::vector<std::string>& arguments = {}) {
+  const Peer peer(TlsPeer(server.certificatePem, server.privateKeyPem, chain));
+  const TemporaryFile file(ca);
+  std::vector<std::string> all = {"--ca", file.Path(), "--timeout", "6"};
+  all.insert(all.end(), arguments.begin(), arguments.end());
+  return RunDoctor(peer.Url(), all);
+}
+
+TEST(DoctorCertificateTest, AValidChainIsAcceptedAndShown) {
+  for (const auto certificate :
+       {ServerCertificate::Valid, ServerCertificate::ThroughIntermediate}) {
+    const DoctorRun run = Examine(certificate);
+    EXPECT_EQ(run.Finding("certificate"), "ok") << run.Text();
+    EXPECT_EQ(run.Detail("certificate", "/isAcceptedByLibrary"), "true");
+    EXPECT_EQ(run.Detail("certificate", "/chain/0/subject"), "\"CN=Dev STS server\"");
+    EXPECT_EQ(run.Detail("certificate", "/chain/0/names"), "[\"localhost\",\"127.0.0.1\",\"::1\"]");
+    EXPECT_EQ(run.Detail("certificate", "/chain/0/fingerprint").size(), 32U * 3 - 1 + 2);
+  }
+}
+
+TEST(DoctorCertificateTest, EachFaultOfACertificateIsFoundAndRefusedByTheLibrary) {
+  const std::pair<ServerCertificate, const char*> cases[] = {
+      {ServerCertificate::Expired, "expired"},
+      {ServerCertificate::NotYetValid, "not-yet-valid"},
+      {ServerCertificate::SelfSigned, "self-signed"},
+      {ServerCertificate::WrongHost, "wrong-name"},
+      {ServerCertificate::NameOnlyInCommonName, "wrong-name"},
+      {ServerCertificate::MissingIntermediate, "unknown-issuer"},
+  };
+  for (const auto& [certificate, finding] : cases) {
+    const DoctorRun run = Examine(certificate);
+    ExpectFailure(run, "certificate", finding, 3, "http");
+    EXPECT_EQ(run.Detail("certificate", "/isAcceptedByLibrary"), "false");
+  }
+}
+
+TEST(DoctorCertificateTest, AWrongNameNamesTheOthers) {
+  EXPECT_THAT(Examine(ServerCertificate::WrongHost).Message("certificate"),
+              HasSubstr("elsewhere.example"));
+  EXPECT_THAT(Examine(ServerCertificate::NameOnlyInCommonName).Message("certificate"),
+              HasSubstr("no subjectAltName"));
+}
+
+TEST(DoctorCertificateTest, TheCaThatIsNeededIsNamed) {
+  const Credential root = MakeCa("Needed root");
+  const Credential intermediate = MakeCa("Intermediate", false, &root);
+  const Credential other = MakeCa("Other root");
+  const Credential server = DevSts::MakeCertificate(ServerSpec(), &intermediate);
+  for (const std::string& chain :
+       {intermediate.certificatePem, intermediate.certificatePem + root.certificatePem}) {
+    const DoctorRun run = Examine(server, chain, other.certificatePem);
+    ExpectFailure(run, "certificate", "unknown-ca", 3, "http");
+    EXPECT_THAT(run.Message("certificate"), HasSubstr("CN=Needed root"));
+  }
+  const DoctorRun alone = Examine(server, "", other.certificatePem);
+  ExpectFailure(alone, "certificate", "unknown-issuer", 3, "http");
+  EXPECT_THAT(alone.Message("certificate"), HasSubstr("CN=Intermediate"));
+}
+
+TEST(DoctorCertificateTest, ACaWithANewKeyIsFound) {
+  const Credential old = MakeCa("Renewed root", true);
+  const Credential current = MakeCa("Renewed root", true);
+  const Credential server = DevSts::MakeCertificate(ServerSpec(), &current);
+  ExpectFailure(Examine(server, "", old.certificatePem), "certificate", "ca-replaced", 3, "http");
+}
+
+TEST(DoctorCertificateTest, ACertificateThatExpiresSoonIsAWarning) {
+  const Credential root = MakeCa("Root");
+  CertificateSpec spec = ServerSpec();
+  spec.notAfter = 10 * kDay + std::chrono::hours(1);
+  const DoctorRun run = Examine(DevSts::MakeCertificate(spec, &root), "", root.certificatePem);
+  EXPECT_EQ(run.Outcome("certificate"), "warning") << run.Text();
+  EXPECT_EQ(run.Finding("certificate"), "expires-soon");
+  EXPECT_THAT(run.Message("certificate"), HasSubstr("in 10 days"));
+  EXPECT_NE(run.Outcome("http"), "skipped");
+}
+
+TEST(DoctorCertificateTest, ThePeerNameReplacesTheHost) {
+  const Credential root = MakeCa("Root");
+  CertificateSpec spec = ServerSpec();
+  spec.addresses.clear();
+  spec.dnsNames = {"sts.example"};
+  const Credential server = DevSts::MakeCertificate(spec, &root);
+  EXPECT_EQ(Examine(server, "", root.certificatePem, {"--peer-name", "sts.example"})
+                .Finding("certificate"),
+            "ok");
+  EXPECT_EQ(Examine(server, "", root.certificatePem).Finding("certificate"), "wrong-name");
+}
+
+TEST(DoctorCertificateTest, ACaThatIsNotOneIsNotTrusted) {
+  CertificateSpec spec = ServerSpec();
+  spec.commonName = "no CA";
+  const Credential pretender = DevSts::MakeCertificate(spec);
+  const Credential server = DevSts::MakeCertificate(ServerSpec(), &pretender);
+  const DoctorRun run = Examine(server, "", pretender.certificatePem);
+  EXPECT_EQ(run.Outcome("certificate"), "failed");
+  EXPECT_EQ(run.Detail("certificate", "/isAcceptedByLibrary"), "false") << run.Text();
+}
+
+}  // namespace
+}  // namespace SsoClient::Tool::Testing

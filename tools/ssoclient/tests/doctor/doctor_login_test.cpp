@@ -1,0 +1,161 @@
+// Findings about logins and their tokens, each produced for real.
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include "devsts/server.h"
+#include "support/doctor_run.h"
+#include "support/temporary_file.h"
+
+namespace SsoClient::Tool::Testing {
+namespace {
+
+using DevSts::Misbehavior;
+using Tarnik::Testing::TemporaryFile;
+using testing::HasSubstr;
+using testing::Not;
+
+class DoctorLoginTest : public testing::Test {
+ protected:
+  DoctorRun Run(const std::vector<std::string>& arguments, const std::string& password = "",
+                const std::string& signerFile = "") {
+    ToolOptions options;
+    options.arguments = {"doctor",
+                         "--json",
+                         "--url",
+                         sts.HttpsUrl(),
+                         "--ca",
+                         ca.Path(),
+                         "--sts-certificate",
+                         signerFile.empty() ? signer.Path() : signerFile};
+    options.arguments.insert(options.arguments.end(), arguments.begin(), arguments.end());
+    if (!password.empty()) {
+      options.arguments.insert(options.arguments.end(), {"--password-fd", "5"});
+      options.descriptors = {{5, password + "\n"}};
+    }
+    options.environment = environment;
+    return DoctorRun(options);
+  }
+
+  DoctorRun RunAlice(const std::string& password = "secret", const std::string& signerFile = "") {
+    return Run({"--user", "alice@EXAMPLE.COM"}, password, signerFile);
+  }
+
+  DevSts::Server sts;
+  TemporaryFile ca{sts.CaCertificatePem()};
+  TemporaryFile signer{sts.SigningCertificatePem()};
+  std::map<std::string, std::optional<std::string>> environment;
+};
+
+TEST_F(DoctorLoginTest, APasswordThatIsAcceptedGivesAToken) {
+  const DoctorRun run = RunAlice();
+  EXPECT_EQ(run.Status(), 0) << run.Text();
+  EXPECT_EQ(run.Finding("login"), "ok");
+  EXPECT_EQ(run.Finding("token"), "ok");
+  EXPECT_EQ(run.Detail("token", "/subject"), "\"alice@EXAMPLE.COM\"");
+  EXPECT_EQ(sts.GetCounters().tokensIssued, 1U);
+  EXPECT_THAT(run.Text(), Not(HasSubstr("secret")));
+}
+
+TEST_F(DoctorLoginTest, ARefusedLoginIsFoundAndTriedOnce) {
+  const DoctorRun run = RunAlice("wrong-one");
+  ExpectFailure(run, "login", "login-refused", 1, "token");
+  EXPECT_THAT(run.Text(), Not(HasSubstr("wrong-one")));
+  EXPECT_EQ(sts.Requests().size(), 2U);  // the harmless one and the login
+}
+
+TEST_F(DoctorLoginTest, AnExpiredPasswordIsFound) {
+  ExpectFailure(Run({"--user", "expired@EXAMPLE.COM"}, "expired-secret"), "login",
+                "password-expired", 1, "token");
+}
+
+TEST_F(DoctorLoginTest, AnotherSignerIsFoundAndNamed) {
+  const TemporaryFile other(sts.StrangerCredential().certificatePem);
+  const DoctorRun run = RunAlice("secret", other.Path());
+  ExpectFailure(run, "login", "signer-mismatch", 3, "token");
+  EXPECT_THAT(run.Detail("login", "/claimedSigners/0/fingerprint"), HasSubstr(":"));
+  const std::string fingerprint = run.Detail("login", "/claimedSigners/0/fingerprint");
+  EXPECT_THAT(run.Message("login"), HasSubstr(fingerprint.substr(1, fingerprint.size() - 2)));
+}
+
+TEST_F(DoctorLoginTest, WithoutASigningCertificateTheSignerIsAWarning) {
+  ToolOptions options;
+  options.arguments = {"doctor",        "--json",  "--url",  sts.HttpsUrl(),
+                       "--ca",          ca.Path(), "--user", "alice@EXAMPLE.COM",
+                       "--password-fd", "5"};
+  options.descriptors = {{5, "secret\n"}};
+  const DoctorRun run(options);
+  EXPECT_EQ(run.Status(), 0) << run.Text();
+  EXPECT_EQ(run.Finding("login"), "signature-not-verified");
+  EXPECT_THAT(run.Message("login"), HasSubstr("SHA-256"));
+}
+
+TEST_F(DoctorLoginTest, OtherFaultsAndTokensAreFound) {
+  Misbehavior fault;
+  fault.fault = DevSts::FaultAnswer{"http://docs.oasis-open.org/ws-sx/ws-trust/200512",
+                                    "RequestFailed", "not today", false, 500};
+  sts.SetMisbehavior(fault);
+  ExpectFailure(RunAlice(), "login", "login-fault", 1, "token");
+
+  sts.ClearMisbehavior();
+  DevSts::AssertionOptions late;
+  late.notBeforeOffset = std::chrono::seconds(-3600);
+  sts.SetAssertionOptions(late);
+  ExpectFailure(RunAlice(), "login", "token-rejected", 3, "token");
+}
+
+TEST_F(DoctorLoginTest, ATokenThatBeginsLaterIsAWarning) {
+  DevSts::AssertionOptions late;
+  late.notBeforeOffset = std::chrono::seconds(-200);
+  sts.SetAssertionOptions(late);
+  const DoctorRun run = RunAlice();
+  EXPECT_EQ(run.Status(), 0) << run.Text();
+  EXPECT_EQ(run.Finding("token"), "token-not-yet-valid");
+}
+
+TEST_F(DoctorLoginTest, AnAnswerThatEndsDuringTheLoginIsFound) {
+  sts.MisbehaveNext({});
+  Misbehavior cut;
+  cut.cutOff = DevSts::CutOff{20, DevSts::CutStyle::Orderly};
+  sts.MisbehaveNext(cut);
+  ExpectFailure(RunAlice(), "login", "login-unanswered", 3, "token");
+}
+
+TEST_F(DoctorLoginTest, NoPasswordIsSentWhileTheClockIsFarOff) {
+  Misbehavior misbehavior;
+  misbehavior.extraHeaders = {{"Date", "Sun, 06 Nov 1994 08:49:37 GMT"}};
+  sts.SetMisbehavior(misbehavior);
+  ExpectFailure(RunAlice(), "clock", "clock-far-off", 4, "login");
+  EXPECT_EQ(sts.Requests().size(), 1U);
+}
+
+TEST_F(DoctorLoginTest, AMissingPasswordIsFound) {
+  ExpectFailure(Run({"--user", "alice@EXAMPLE.COM"}), "login", "no-password", 2, "token");
+}
+
+TEST_F(DoctorLoginTest, ACertificateLogsIn) {
+  const DevSts::Credential client = sts.MakeClientCredential("bob");
+  sts.RegisterCertificate("bob@EXAMPLE.COM", client.certificatePem);
+  const TemporaryFile certificate(client.certificatePem);
+  const TemporaryFile key(client.privateKeyPem);
+  chmod(key.Path().c_str(), 0600);
+  const DoctorRun run = Run({"--certificate", certificate.Path(), "--key", key.Path()});
+  EXPECT_EQ(run.Status(), 0) << run.Text();
+  EXPECT_EQ(run.Finding("credentials"), "ok");
+  EXPECT_EQ(run.Detail("token", "/subject"), "\"bob@EXAMPLE.COM\"");
+}
+
+TEST_F(DoctorLoginTest, KerberosWithoutTicketsIsFound) {
+  environment = {{"KRB5CCNAME", "FILE:/nonexistent/cache"}, {"KRB5_CONFIG", "/dev/null"}};
+  const DoctorRun run = Run({"--kerberos"});
+  ExpectFailure(run, "login", "kerberos-failed", 4, "token");
+  EXPECT_THAT(run.Remedy("login"), HasSubstr("kinit"));
+}
+
+}  // namespace
+}  // namespace SsoClient::Tool::Testing

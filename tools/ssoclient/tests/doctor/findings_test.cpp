@@ -1,0 +1,124 @@
+// What cannot be produced on every machine: findings of the pure functions.
+#include <cerrno>
+
+#include <gtest/gtest.h>
+#include <openssl/x509_vfy.h>
+
+#include "doctor/chain.h"
+#include "doctor/clock.h"
+#include "doctor/report.h"
+#include "doctor/tcp_findings.h"
+#include "doctor/tls_findings.h"
+#include "doctor/token_findings.h"
+
+namespace SsoClient::Tool::Doctor {
+namespace {
+
+using Tarnik::System::DateTime;
+
+TEST(TcpFindingsTest, OneAddressThatAcceptsIsEnough) {
+  EXPECT_EQ(JudgeConnections({{0, false}}, 443).name, "ok");
+  // A machine without IPv6 always fails to reach these addresses.
+  EXPECT_EQ(JudgeConnections({{ENETUNREACH, true}, {0, false}}, 443).name, "ok");
+  const Finding some = JudgeConnections({{0, false}, {ECONNREFUSED, false}}, 443);
+  EXPECT_EQ(some.name, "some-addresses-fail");
+  EXPECT_EQ(some.outcome, StepOutcome::kWarning);
+}
+
+TEST(TcpFindingsTest, TheErrorThatSaysMostCounts) {
+  EXPECT_EQ(JudgeConnections({{ENETUNREACH, true}, {ECONNREFUSED, false}}, 443).name, "refused");
+  EXPECT_EQ(JudgeConnections({{ENETUNREACH, true}, {ENETUNREACH, false}}, 443).name,
+            "network-unreachable");
+  EXPECT_EQ(JudgeConnections({{ENETUNREACH, true}}, 443).name, "only-ipv6");
+  EXPECT_EQ(JudgeConnections({{EHOSTUNREACH, false}}, 443).name, "host-unreachable");
+  EXPECT_EQ(JudgeConnections({{EMFILE, false}}, 443).name, "tcp-failed");
+}
+
+TEST(TlsFindingsTest, ASecondConnectionThatIsRefusedIsFound) {
+  TlsFacts facts;
+  facts.isConnected = false;
+  EXPECT_EQ(JudgeTls(facts, 443).name, "tls-no-connection");
+}
+
+TEST(TlsFindingsTest, AlertsHaveTheirNames) {
+  EXPECT_EQ(AlertName(70), "protocol_version");
+  EXPECT_EQ(AlertName(250), "250");
+}
+
+std::string ChainFinding(int error, bool isSelfIssued = false) {
+  ChainFacts facts;
+  ChainLink link;
+  link.notAfter = DateTime::Parse("2030-01-01T00:00:00Z");
+  link.isSelfIssued = isSelfIssued;
+  facts.links = {link};
+  facts.errors = {error};
+  return JudgeChain(facts, DateTime::Parse("2026-01-01T00:00:00Z")).name;
+}
+
+TEST(ChainFindingsTest, EachErrorOfTheVerificationHasItsFinding) {
+  EXPECT_EQ(ChainFinding(X509_V_ERR_CERT_REVOKED), "revoked");
+  EXPECT_EQ(ChainFinding(X509_V_ERR_UNABLE_TO_GET_CRL), "revocation-unknown");
+  EXPECT_EQ(ChainFinding(X509_V_ERR_CRL_HAS_EXPIRED), "revocation-unknown");
+  EXPECT_EQ(ChainFinding(X509_V_ERR_INVALID_PURPOSE), "not-trusted");
+  EXPECT_EQ(ChainFinding(X509_V_ERR_EE_KEY_TOO_SMALL), "not-trusted");
+  // A CA of this machine that has expired; the chain of the service is current.
+  EXPECT_EQ(ChainFinding(X509_V_ERR_CERT_HAS_EXPIRED), "expired");
+}
+
+TEST(ChainFindingsTest, ACertificateNeedsAttentionThirtyDaysBeforeItsEnd) {
+  ChainFacts facts;
+  ChainLink link;
+  link.notAfter = DateTime::Parse("2026-01-31T00:00:00Z");
+  facts.links = {link};
+  EXPECT_EQ(JudgeChain(facts, DateTime::Parse("2026-01-01T00:00:00Z")).name, "ok");
+  EXPECT_EQ(JudgeChain(facts, DateTime::Parse("2026-01-01T00:00:01Z")).name, "expires-soon");
+}
+
+TEST(ClockTest, TheMiddleOfTheRoundTripIsCompared) {
+  const ClockOffset offset = OffsetOf(1000, 900'000'000, 904'000'000);
+  EXPECT_DOUBLE_EQ(offset.seconds, 98.5);  // the Date does not show half a second on average
+  EXPECT_DOUBLE_EQ(offset.uncertainty, 2.5);
+}
+
+TEST(ClockTest, DatesHaveOneForm) {
+  EXPECT_EQ(ParseHttpDate("Sun, 06 Nov 1994 08:49:37 GMT"), 784111777);
+  EXPECT_FALSE(ParseHttpDate("Sun, 06 Nov 1994 08:49:37 GMT+1"));
+  EXPECT_FALSE(ParseHttpDate("1994-11-06T08:49:37Z"));
+  EXPECT_FALSE(ParseHttpDate(""));
+}
+
+TEST(ClockTest, OnlyACertainDifferenceIsAProblem) {
+  EXPECT_EQ(JudgeClock({61, 0.5}).name, "clock-off");
+  EXPECT_EQ(JudgeClock({61, 2}).name, "ok");
+  EXPECT_EQ(JudgeClock({-601, 0.5}).name, "clock-far-off");
+  EXPECT_EQ(JudgeClock({-601, 2}).name, "clock-off");
+}
+
+TEST(TokenFindingsTest, AValidityThatIsNotNowIsAWarning) {
+  const DateTime start = DateTime::Parse("2026-01-01T00:00:00Z");
+  const DateTime end = DateTime::Parse("2026-01-01T00:05:00Z");
+  const auto name = [&](const char* now) {
+    return JudgeValidity(start, end, DateTime::Parse(now)).name;
+  };
+  EXPECT_EQ(name("2025-12-31T23:59:56Z"), "ok");
+  EXPECT_EQ(name("2025-12-31T23:59:54Z"), "token-not-yet-valid");
+  EXPECT_EQ(name("2026-01-01T00:04:59Z"), "ok");
+  EXPECT_EQ(name("2026-01-01T00:05:00Z"), "token-already-expired");
+}
+
+TEST(ReportTest, TheFirstFailureIsTheCauseAndElseTheFirstWarning) {
+  Report report;
+  report.steps.resize(3);
+  EXPECT_EQ(FirstCause(report), nullptr);
+  EXPECT_EQ(StatusOf(report, true), ExitStatus::kDone);
+  report.steps[0].finding = Warning(ExitStatus::kLocal, "a", "", "");
+  EXPECT_EQ(FirstCause(report), &report.steps[0]);
+  EXPECT_EQ(StatusOf(report, false), ExitStatus::kDone);
+  EXPECT_EQ(StatusOf(report, true), ExitStatus::kLocal);
+  report.steps[2].finding = Failure(ExitStatus::kRefused, "b", "", "");
+  EXPECT_EQ(FirstCause(report), &report.steps[2]);
+  EXPECT_EQ(StatusOf(report, false), ExitStatus::kRefused);
+}
+
+}  // namespace
+}  // namespace SsoClient::Tool::Doctor
