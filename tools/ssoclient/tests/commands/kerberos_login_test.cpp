@@ -1,0 +1,90 @@
+#include <memory>
+#include <string>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
+#include <stdlib.h>
+
+#include <devsts/kerberos_realm.h>
+
+#include "support/service_fixture.h"
+
+namespace SsoClient::Tool::Testing {
+namespace {
+
+using testing::HasSubstr;
+
+constexpr const char* kService = "HTTP@sts.example";
+
+struct Kerberos {
+  Kerberos() {
+    // Read by the dev STS, in this process, when it begins to accept tickets.
+    setenv("KRB5_CONFIG", realm.ConfigPath().c_str(), 1);
+    realm.AddUser("alice", "alice-secret");
+    aliceCache = realm.Login("alice", "alice-secret");
+    machineKeytab = realm.AddKeytab("machine");
+    DevSts::ServerOptions options;
+    options.negotiation.keytab = realm.AddKeytab("HTTP/sts.example");
+    sts = std::make_unique<DevSts::Server>(options);
+  }
+
+  DevSts::KerberosRealm realm;
+  std::string aliceCache;
+  std::string machineKeytab;
+  std::unique_ptr<DevSts::Server> sts;
+};
+
+Kerberos& TheKerberos() {
+  static Kerberos kerberos;
+  return kerberos;
+}
+
+class KerberosLoginTest : public ServiceTest {
+ protected:
+  KerberosLoginTest() {
+    WritePrivate("ca.pem", TheKerberos().sts->CaCertificatePem());
+    WritePrivate("sts.pem", TheKerberos().sts->SigningCertificatePem());
+  }
+
+  ToolResult LogInByKerberos(const std::vector<std::string>& arguments) const {
+    ToolOptions options;
+    options.arguments = Joined({"login", "--url", TheKerberos().sts->HttpsUrl(), "--ca",
+                                PathOf("ca.pem"), "--sts-certificate", PathOf("sts.pem"),
+                                "--kerberos", "--json", "--output", PathOf("token")},
+                               arguments);
+    options.environment["KRB5_CONFIG"] = TheKerberos().realm.ConfigPath();
+    options.environment["KRB5CCNAME"] = "FILE:" + PathOf("none");
+    return RunTool(options);
+  }
+};
+
+TEST_F(KerberosLoginTest, LogsInWithTheTicketsOfACache) {
+  const ToolResult result =
+      LogInByKerberos({"--service", kService, "--ccache", TheKerberos().aliceCache});
+  ASSERT_EQ(result.status, 0) << result.out << result.err;
+  EXPECT_EQ(result.Json()["token"]["subject"]["name"], "alice");
+}
+
+TEST_F(KerberosLoginTest, LogsInWithAKeytab) {
+  const ToolResult result = LogInByKerberos(
+      {"--service", kService, "--principal", "machine", "--keytab", TheKerberos().machineKeytab});
+  ASSERT_EQ(result.status, 0) << result.out << result.err;
+  EXPECT_EQ(result.Json()["token"]["subject"]["name"], "machine");
+}
+
+TEST_F(KerberosLoginTest, WithoutTicketsItIsAFailureOfThisMachine) {
+  const ToolResult result = LogInByKerberos({"--service", kService});
+  EXPECT_EQ(result.status, 4);
+  EXPECT_EQ(result.Json()["error"]["kind"], "kerberos");
+  EXPECT_THAT(result.Json()["error"]["remedy"].get<std::string>(), HasSubstr("kinit"));
+}
+
+TEST_F(KerberosLoginTest, AMalformedServiceIsAWrongCommandLine) {
+  const ToolResult result = LogInByKerberos({"--service", "sts.example"});
+  EXPECT_EQ(result.status, 2);
+  EXPECT_EQ(result.Json()["error"]["kind"], "bad-service");
+}
+
+}  // namespace
+}  // namespace SsoClient::Tool::Testing
