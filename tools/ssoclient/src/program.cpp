@@ -5,6 +5,7 @@
 #include <memory>
 #include <ostream>
 #include <string>
+#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -13,6 +14,8 @@
 
 #include "commands/command.h"
 #include "failure.h"
+#include "help/help_formatter.h"
+#include "output/safe_text.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -36,11 +39,21 @@ std::vector<Registered> AddCommands(CLI::App& program) {
 void PrintJson(const Console& console, const std::string& command, ExitStatus status,
                const Json& members) {
   Json result = Json::object();
-  result["command"] = command;
+  if (!command.empty()) {
+    result["command"] = command;
+  }
   result["status"] = NameOf(status);
   result.update(members);
   // Text that is not UTF-8 cannot come from a token, but may come from a file name.
-  console.out << result.dump(2, ' ', false, Json::error_handler_t::replace) << '\n';
+  console.out << SafeJson(result.dump(2, ' ', false, Json::error_handler_t::replace)) << '\n';
+}
+
+void PrintFailure(const Console& console, const Failure& failure) {
+  console.err << console.PaintError(Colour::kBad, "ssoclient: ")
+              << SafeText(console, failure.message) << '\n';
+  if (!failure.remedy.empty()) {
+    console.err << "  remedy: " << SafeText(console, failure.remedy) << '\n';
+  }
 }
 
 void ReportFailure(const Console& console, const Registered& chosen, const Failure& failure) {
@@ -52,10 +65,40 @@ void ReportFailure(const Console& console, const Registered& chosen, const Failu
     PrintJson(console, chosen.subcommand->get_name(), failure.status, {{"error", error}});
     return;
   }
-  console.err << console.PaintError(Colour::kBad, "ssoclient: ") << failure.message << '\n';
-  if (!failure.remedy.empty()) {
-    console.err << "  remedy: " << failure.remedy << '\n';
+  PrintFailure(console, failure);
+}
+
+// The command line has no command, or it is not known which one.
+bool IsJsonWanted(int argc, const char* const* argv) {
+  return std::any_of(argv, argv + argc,
+                     [](const char* each) { return std::string_view(each) == "--json"; });
+}
+
+// What is wrong, when no command has been read: in words of our own, since those of the library
+// depend on its version.
+std::string MessageWithoutCommand(int argc, const char* const* argv) {
+  if (argc < 2) {
+    return "there is no command";
   }
+  const std::string first = argv[1];
+  return first.compare(0, 1, "-") == 0 ? "there is no option " + first + " without a command"
+                                       : "there is no command '" + first + "'";
+}
+
+ExitStatus ReportUsage(const Console& console, const CLI::App& program, bool isJson,
+                       const std::string& message) {
+  const std::vector<CLI::App*> chosen = program.get_subcommands();
+  const std::string name = chosen.empty() ? std::string() : chosen.front()->get_name();
+  const std::string help = program.get_name() + (name.empty() ? "" : " " + name) + " --help";
+  const Failure failure{ExitStatus::kUsage, "usage", message, "see '" + help + "'"};
+  if (isJson) {
+    PrintJson(
+        console, name, failure.status,
+        {{"error", {{"kind", failure.kind}, {"message", message}, {"remedy", failure.remedy}}}});
+  } else {
+    PrintFailure(console, failure);
+  }
+  return failure.status;
 }
 
 ExitStatus RunCommand(const Console& console, const Registered& chosen) {
@@ -78,14 +121,21 @@ ExitStatus RunCommand(const Console& console, const Registered& chosen) {
 ExitStatus RunProgram(int argc, const char* const* argv, const Console& console) {
   CLI::App program("Obtains, renews and checks SAML tokens of a Security Token Service.",
                    "ssoclient");
-  program.set_version_flag("--version", std::string("ssoclient ") + SSOCLIENT_TOOL_VERSION);
+  program.set_version_flag("--version", std::string("ssoclient ") + SSOCLIENT_TOOL_VERSION,
+                           "Print the version");
   program.require_subcommand(1);
+  program.formatter(std::make_shared<HelpFormatter>());
   const std::vector<Registered> commands = AddCommands(program);
   try {
     program.parse(argc, argv);
+  } catch (const CLI::Success& asked) {
+    // --help or --version
+    program.exit(asked, console.out, console.err);
+    return ExitStatus::kDone;
   } catch (const CLI::ParseError& error) {
-    const int code = program.exit(error, console.out, console.err);
-    return code == 0 ? ExitStatus::kDone : ExitStatus::kUsage;
+    const std::string message =
+        program.get_subcommands().empty() ? MessageWithoutCommand(argc, argv) : error.what();
+    return ReportUsage(console, program, IsJsonWanted(argc, argv), message);
   }
   const auto chosen = std::find_if(commands.begin(), commands.end(), [](const Registered& each) {
     return each.subcommand->parsed();

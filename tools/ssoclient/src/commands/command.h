@@ -40,6 +40,9 @@ class Command {
  protected:
   /// Adds --json to the subcommand.
   void AddJsonOption(CLI::App& command);
+  /// Sets the command line, or several in lines, with which the subcommand's help starts. The first
+  /// line of its description is what the help of the program says about it.
+  static void SetExample(CLI::App& command, const std::string& example);
 
  private:
   bool wantsJson_ = false;

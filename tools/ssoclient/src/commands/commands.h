@@ -7,6 +7,8 @@
 
 namespace SsoClient::Tool {
 
+std::unique_ptr<Command> MakeShowCommand();
+std::unique_ptr<Command> MakeVerifyCommand();
 std::unique_ptr<Command> MakeDoctorCommand();
 
 }  // namespace SsoClient::Tool

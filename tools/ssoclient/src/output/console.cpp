@@ -1,5 +1,7 @@
 #include "output/console.h"
 
+#include <algorithm>
+#include <cctype>
 #include <cstdlib>
 #include <iostream>
 
@@ -43,6 +45,23 @@ bool AreColoursWelcome() {
          (terminal == nullptr || std::string_view(terminal) != "dumb");
 }
 
+// By the name of the locale, since the locale itself need not be installed on a server. The first
+// variable that is set counts (POSIX.1-2017, base definitions, section 8.2).
+bool IsLocaleUtf8() {
+  for (const char* variable : {"LC_ALL", "LC_CTYPE", "LANG"}) {
+    const char* value = std::getenv(variable);
+    if (value == nullptr || *value == '\0') {
+      continue;
+    }
+    std::string name(value);
+    name.erase(std::remove(name.begin(), name.end(), '-'), name.end());
+    std::transform(name.begin(), name.end(), name.begin(),
+                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+    return name.find(".utf8") != std::string::npos;
+  }
+  return false;
+}
+
 int ColumnsOf(int descriptor) {
   winsize size{};
   const bool isKnown = ioctl(descriptor, TIOCGWINSZ, &size) == 0 && size.ws_col > 0;
@@ -61,7 +80,8 @@ Console Console::OfProcess() {
           .errIsTerminal = errIsTerminal,
           .outHasColours = outIsTerminal && welcome,
           .errHasColours = errIsTerminal && welcome,
-          .columns = outIsTerminal ? ColumnsOf(STDOUT_FILENO) : kDefaultColumns};
+          .columns = outIsTerminal ? ColumnsOf(STDOUT_FILENO) : kDefaultColumns,
+          .isUtf8 = IsLocaleUtf8()};
 }
 
 std::string Console::Paint(Colour colour, std::string_view text) const {

@@ -20,6 +20,8 @@ struct Console {
   bool errHasColours = false;
   /// The columns of the terminal, 80 without one.
   int columns = 80;
+  /// Whether the locale's characters are UTF-8; otherwise only ASCII is written.
+  bool isUtf8 = false;
 
   /// The console of this process.
   static Console OfProcess();
