@@ -44,7 +44,7 @@ CLI::App* DoctorCommand::AddTo(CLI::App& program) {
       "Examines files, DNS, TCP, TLS, certificates, HTTP, clocks and the service one after the "
       "other, and says what to do about the first problem. Without a login it sends no name, no "
       "password and no token, and cannot be counted as a failed login. With one it logs in once.");
-  command->footer("ssoclient doctor --url https://sts.example.com/sts --ca ca.pem");
+  SetExample(*command, "ssoclient doctor --url https://sts.example.com/sts --ca ca.pem");
   connection_.AddTo(*command);
   command
       ->add_option("--sts-certificate", stsCertificate_,

@@ -91,8 +91,8 @@ std::string HarmlessRequest(const Tarnik::System::DateTime& now) {
   const auto expires = Tarnik::System::DateTimeFromUtc(now.GetUtcTime() + kLifetime, false);
   const std::string trust = kTrust;
   return std::string("<S:Envelope xmlns:S=\"") + kSoap + "\"><S:Header><o:Security xmlns:o=\"" +
-         kSecurity + "\" xmlns:u=\"" + kUtility + "\" S:mustUnderstand=\"1\"><u:Timestamp>" +
-         "<u:Created>" + now.ToString() + "</u:Created><u:Expires>" + expires.ToString() +
+         kSecurity + "\" xmlns:u=\"" + kUtility + "\"><u:Timestamp>" + "<u:Created>" +
+         now.ToString() + "</u:Created><u:Expires>" + expires.ToString() +
          "</u:Expires></u:Timestamp></o:Security></S:Header><S:Body>" +
          "<t:RequestSecurityToken xmlns:t=\"" + trust + "\"><t:TokenType>" + trust +
          "/RSTR/Status</t:TokenType><t:RequestType>" + trust +

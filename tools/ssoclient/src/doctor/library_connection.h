@@ -12,7 +12,7 @@ namespace SsoClient::Tool::Doctor {
 /// The connections of the library to the service.
 Tarnik::Ref<Tarnik::Http::ConnectionSpec> MakeConnectionSpec(const Examination& examination);
 
-/// How the library judges the service, by a connection on which nothing is sent.
+/// Whether the library trusts the service, by a connection on which nothing is sent.
 struct LibraryVerdict {
   enum class Kind {
     kAccepted,

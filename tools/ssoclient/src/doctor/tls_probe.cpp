@@ -62,7 +62,7 @@ OwnedContext MakeContext(TlsOffer offer) {
   Require(SSL_CTX_set_min_proto_version(context.get(), lowest) == 1 &&
           SSL_CTX_set_max_proto_version(context.get(), highest) == 1 &&
           SSL_CTX_set_cipher_list(context.get(), suites) == 1);
-  // The chain is judged after the handshake.
+  // The chain is verified after the handshake.
   SSL_CTX_set_verify(context.get(), SSL_VERIFY_NONE, nullptr);
   SSL_CTX_set_client_cert_cb(context.get(), RecordRequest);
   SSL_CTX_set_info_callback(context.get(), RecordAlert);
