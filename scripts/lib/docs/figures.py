@@ -89,7 +89,8 @@ def count_in(source, pattern, expression, exclude=""):
 def tests(source):
     """The counts of the tests, from their sources."""
     case = r"^(?:TYPED_)?TEST(?:_F|_P)?\("
-    roots = ["tests", "tarnik/tests", "gssapi/tests", "access/tests", "devsts/tests"]
+    roots = ["tests", "tarnik/tests", "gssapi/tests", "access/tests", "devsts/tests",
+             "tools/ssoclient/tests"]
     everything = sum(count_in(source, f"{root}/**/*.cpp", case) for root in roots)
     rows = [
         ("test cases, each with many inputs where rules have tables", everything),
