@@ -29,8 +29,15 @@ std::size_t Part(std::size_t total, std::size_t index, std::size_t count) noexce
 }  // namespace
 
 std::size_t MemoryOf(std::string_view text) noexcept {
-  const auto marks = static_cast<std::size_t>(std::count(text.begin(), text.end(), '<'));
-  return 1024 + 3 * text.size() + 72 * marks;
+  std::size_t bytes = 1024 + 3 * text.size();
+  char previous = '<';
+  for (const char current : text) {
+    const bool beginsText = previous == '>' && current != '<';
+    bytes += current == '<' ? 72 : current == '=' ? 32 : 0;
+    bytes += beginsText ? 56 : 0;
+    previous = current;
+  }
+  return bytes;
 }
 
 CheckedTokens::CheckedTokens(const GateCacheConfig& config) : shards_(CountShards(config)) {

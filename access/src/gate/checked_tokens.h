@@ -18,8 +18,9 @@
 
 namespace SsoClient::Access {
 
-/// The memory of a remembered token with this text, as it is counted. The nodes of its document are
-/// counted by their marks, since the presenter may add comments of a few bytes to any token.
+/// The memory of a remembered token with this text, as it is counted. The nodes and attributes of
+/// its document are counted by their marks, since the presenter may add some of a few bytes to any
+/// token: comments, and elements in the KeyInfo of its signature, which is not signed.
 std::size_t MemoryOf(std::string_view text) noexcept;
 
 /// The tokens that a gate has accepted, by the SHA-256 of their texts. Thread-safe: the tokens are

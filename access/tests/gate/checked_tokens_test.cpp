@@ -38,6 +38,9 @@ TEST(CheckedTokensTest, MemoryIsCountedByLengthAndMarks) {
   EXPECT_EQ(MemoryOf("text"), 1036U);
   EXPECT_EQ(MemoryOf("<a></a>"), 1024U + 3 * 7 + 2 * 72);
   EXPECT_EQ(MemoryOf("<!---->"), 1024U + 3 * 7 + 72);
+  EXPECT_EQ(MemoryOf("<a/>b"), 1024U + 3 * 5 + 72 + 56);
+  EXPECT_EQ(MemoryOf("<a b=''/>"), 1024U + 3 * 9 + 72 + 32);
+  EXPECT_EQ(MemoryOf(">"), 1024U + 3);
 }
 
 TEST(CheckedTokensTest, FindsWhatWasInserted) {

@@ -29,22 +29,50 @@ class GateHitsTest : public GateFixture {
     EXPECT_EQ(metrics.cachedTokens, tokens);
     EXPECT_EQ(metrics.cachedBytes == 0, tokens == 0);
   }
+  static std::string Times(std::size_t count, const std::string& piece) {
+    std::string result;
+    for (std::size_t i = 0; i < count; ++i) {
+      result += piece;
+    }
+    return result;
+  }
+  std::string WithKeyValues(const std::string& values) const {
+    return Replaced(token, "</ds:KeyInfo>", values + "</ds:KeyInfo>");
+  }
+  /// Expects that `larger` counts at least `bytes` bytes more than the token.
+  void ExpectCountOfAdditions(const std::string& larger, std::size_t bytes) const {
+    const auto gate = Make();
+    ExpectAccepted(CheckAt(*gate, token));
+    const std::size_t before = gate->Metrics().cachedBytes;
+    ExpectAccepted(CheckAt(*gate, larger));
+    EXPECT_GE(gate->Metrics().cachedBytes, 2 * before + bytes);
+  }
 
   const std::string token = Signed(text);
 };
 
 // A presenter can add comments to any token. Each takes up to 64 bytes of memory.
 TEST_F(GateHitsTest, CommentsCountAsMemory) {
-  constexpr std::size_t kComments = 1000;
-  const auto gate = Make();
-  ExpectAccepted(CheckAt(*gate, token));
-  const std::size_t before = gate->Metrics().cachedBytes;
-  std::string longer = token;
-  for (std::size_t i = 0; i < kComments; ++i) {
-    longer += "<!---->";
+  ExpectCountOfAdditions(token + Times(1000, "<!---->"), 1000 * 64);
+}
+
+// The content of KeyInfo is not signed. Elements without an end tag and texts between them take up
+// to 135 bytes together, and attributes with three letters up to 44.
+TEST_F(GateHitsTest, ElementsAndTextsInKeyInfoCountAsMemory) {
+  ExpectCountOfAdditions(WithKeyValues("<ds:KeyValue>" + Times(1000, "<a/>b") + "</ds:KeyValue>"),
+                         1000 * 135);
+}
+
+TEST_F(GateHitsTest, AttributesInKeyInfoCountAsMemory) {
+  std::string values;
+  for (char first = 'a'; first <= 'z'; ++first) {
+    values += "<ds:KeyValue";
+    for (char last = 'a'; last <= 'z'; ++last) {
+      values.append({' ', first, 'x', last}).append("=''");
+    }
+    values += "/>";
   }
-  ExpectAccepted(CheckAt(*gate, longer));
-  EXPECT_GE(gate->Metrics().cachedBytes, 2 * before + 64 * kComments);
+  ExpectCountOfAdditions(WithKeyValues(values), std::size_t{26} * 26 * 44);
 }
 
 TEST_F(GateHitsTest, Hit) {
@@ -77,8 +105,15 @@ TEST_F(GateHitsTest, NoCache) {
 TEST_F(GateHitsTest, MemoryIsCountedByTheLengthOfTheTextAndItsMarks) {
   const auto gate = Make();
   ExpectAccepted(CheckAt(*gate, token));
-  const auto marks = static_cast<std::size_t>(std::count(token.begin(), token.end(), '<'));
-  EXPECT_EQ(gate->Metrics().cachedBytes, 1024 + 3 * token.size() + 72 * marks);
+  const auto count = [this](char mark) {
+    return static_cast<std::size_t>(std::count(token.begin(), token.end(), mark));
+  };
+  std::size_t texts = 0;
+  for (std::size_t i = 1; i < token.size(); ++i) {
+    texts += token[i - 1] == '>' && token[i] != '<' ? 1 : 0;
+  }
+  EXPECT_EQ(gate->Metrics().cachedBytes,
+            1024 + 3 * token.size() + 72 * count('<') + 56 * texts + 32 * count('='));
 }
 
 TEST_F(GateHitsTest, OneByteDiffers) {

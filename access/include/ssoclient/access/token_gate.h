@@ -34,8 +34,9 @@ struct GateCacheConfig {
   /// The number of tokens; 0 for no cache. The cache is divided into up to 16 parts; of a part that
   /// is full, the token that was not presented for the longest is evicted first.
   std::size_t tokens = 10000;
-  /// The memory of all tokens. A token counts a kilobyte, three times the length of its text, and
-  /// 72 bytes for each "<" in it.
+  /// The memory of all tokens. A token counts a kilobyte, three times the length of its text, 72
+  /// bytes for each "<" in it, 56 for each ">" that another character than "<" follows, and 32 for
+  /// each "=".
   std::size_t bytes = std::size_t{64} * 1024 * 1024;
 };
 
