@@ -1,5 +1,6 @@
 #include <ostream>
 #include <string>
+#include <vector>
 
 #include <CLI/CLI.hpp>
 #include <nlohmann/json.hpp>
@@ -9,6 +10,9 @@
 #include "doctor/runner.h"
 #include "input/secret.h"
 #include "options/connection_options.h"
+#include "options/kerberos_options.h"
+#include "options/key_options.h"
+#include "options/service_options.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -25,15 +29,10 @@ class DoctorCommand final : public Command {
 
   ConnectionOptions connection_;
   SecretOption password_;
-  SecretOption passphrase_;
-  std::string stsCertificate_;
+  KeyOptions key_;
+  KerberosOptions kerberos_;
+  std::vector<std::string> signerFiles_;
   std::string user_;
-  std::string certificate_;
-  std::string key_;
-  std::string service_;
-  std::string principal_;
-  std::string keytab_;
-  bool isKerberos_ = false;
   bool isStrict_ = false;
 };
 
@@ -46,10 +45,7 @@ CLI::App* DoctorCommand::AddTo(CLI::App& program) {
       "password and no token, and cannot be counted as a failed login. With one it logs in once.");
   SetExample(*command, "ssoclient doctor --url https://sts.example.com/sts --ca ca.pem");
   connection_.AddTo(*command);
-  command
-      ->add_option("--sts-certificate", stsCertificate_,
-                   "The certificates, PEM or DER, with which the service may sign tokens")
-      ->type_name("FILE");
+  AddSignersOption(*command, signerFiles_);
   AddLoginOptions(*command);
   command->add_flag("--strict", isStrict_, "Treat warnings as failures in the exit status");
   AddJsonOption(*command);
@@ -59,50 +55,19 @@ CLI::App* DoctorCommand::AddTo(CLI::App& program) {
 void DoctorCommand::AddLoginOptions(CLI::App& command) {
   const std::string group = "Login";
   CLI::Option* const user =
-      command.add_option("--user", user_, "Log in as this user with a password")
+      command.add_option("--user", user_, "Log in with this user name and a password")
           ->type_name("NAME")
           ->group(group);
-  password_.AddTo(command, "password");
-  CLI::Option* const certificate =
-      command.add_option("--certificate", certificate_, "Log in with this certificate")
-          ->type_name("FILE")
-          ->group(group)
-          ->excludes(user);
-  CLI::Option* const key =
-      command.add_option("--key", key_, "The private key of the certificate, PEM")
-          ->type_name("FILE")
-          ->group(group)
-          ->needs(certificate);
-  certificate->needs(key);
-  passphrase_.AddTo(command, "passphrase");
-  CLI::Option* const kerberos = command.add_flag("--kerberos", isKerberos_, "Log in with Kerberos")
-                                    ->group(group)
-                                    ->excludes(user)
-                                    ->excludes(certificate);
-  command
-      .add_option("--service", service_,
-                  "The service's name in Kerberos; HTTP@ and the host of the URL without it")
-      ->type_name("NAME@HOST")
-      ->group(group)
-      ->needs(kerberos);
-  command.add_option("--principal", principal_, "The Kerberos principal that logs in")
-      ->type_name("NAME")
-      ->group(group)
-      ->needs(kerberos);
-  command
-      .add_option("--keytab", keytab_,
-                  "The keytab of the principal; the credential cache without "
-                  "it")
-      ->type_name("FILE")
-      ->group(group)
-      ->needs(kerberos);
+  password_.AddTo(command, "password", group);
+  CLI::Option* const kerberos = kerberos_.AddTo(command, group)->excludes(user);
+  key_.AddTo(command, false)->excludes(user)->excludes(kerberos);
 }
 
 Doctor::LoginKind DoctorCommand::Kind() const {
-  if (isKerberos_) {
+  if (kerberos_.IsGiven()) {
     return Doctor::LoginKind::kKerberos;
   }
-  if (!certificate_.empty()) {
+  if (key_.IsGiven()) {
     return Doctor::LoginKind::kCertificate;
   }
   return user_.empty() ? Doctor::LoginKind::kNone : Doctor::LoginKind::kPassword;
@@ -115,17 +80,18 @@ Doctor::Plan DoctorCommand::MakePlan() const {
   plan.caFiles = connection_.caFiles;
   plan.crlFiles = connection_.crlFiles;
   plan.timeout = std::chrono::milliseconds(static_cast<long>(connection_.timeoutSec * 1000));
-  plan.stsCertificateFile = stsCertificate_;
+  plan.stsCertificateFiles = signerFiles_;
   plan.user = user_;
-  plan.certificateFile = certificate_;
-  plan.keyFile = key_;
-  plan.kerberosService = service_;
-  plan.principal = principal_;
-  plan.keytab = keytab_;
+  plan.certificateFile = key_.CertificateFile();
+  plan.keyFile = key_.KeyFile();
+  plan.kerberosService = kerberos_.Service();
+  plan.principal = kerberos_.Principal();
+  plan.credentialCache = kerberos_.CredentialCache();
+  plan.keytab = kerberos_.Keytab();
   plan.login = Kind();
   plan.makeSslContext = [this] { return connection_.MakeSslContext(); };
-  plan.readPassword = [this] { return password_.Read("Password of " + user_ + ": ", false); };
-  plan.readPassphrase = [this] { return passphrase_.Read("Passphrase of " + key_ + ": ", false); };
+  plan.readPassword = [this] { return password_.Read("Password for " + user_ + ": ", false); };
+  plan.loadIdentity = [this](bool mayBeOpen) { return key_.Load(mayBeOpen); };
   return plan;
 }
 

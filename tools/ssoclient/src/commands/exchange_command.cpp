@@ -40,10 +40,12 @@ CLI::App* ExchangeCommand::AddTo(CLI::App& program) {
       "Get another token for a token\n"
       "Asks the service for another token by a token that is bound to the key of --certificate: "
       "for other services (--audience), delegated to somebody (--delegate-to), or on behalf of "
-      "somebody else (--act-as).");
+      "somebody else (--act-as). What is delegated, or acted with, must be a token that was "
+      "obtained with --delegable.");
   SetExample(*command,
-             "ssoclient exchange --url https://sts.example.com/sts --sts-certificate sts.pem \\\n"
-             "    --certificate me.pem --key me.key --act-as alice.xml --output both.xml mine.xml");
+             "ssoclient exchange --url https://sts.example.com/sts --certificate me.pem \\\n"
+             "    --key me.key --sts-certificate sts.pem --act-as alice.xml \\\n"
+             "    --output new.xml mine.xml");
   command->add_option("FILE", file_, "The token to exchange; - for standard input")->required();
   service_.AddConnectionTo(*command);
   service_.AddSignersTo(*command);
@@ -58,6 +60,17 @@ CLI::App* ExchangeCommand::AddTo(CLI::App& program) {
   return command;
 }
 
+Token Exchange(const Console& console, const ServiceSetup& setup, const Token& own,
+               const TokenSpec& spec) {
+  try {
+    return RunCall<Token>(console, setup, [own, spec](const auto& service) {
+      return service.AcquireTokenByToken(*own, spec);
+    });
+  } catch (const ToolException& exception) {
+    RethrowWithRemedy(exception, spec, own.get());
+  }
+}
+
 Outcome ExchangeCommand::Run(const Console& console) {
   output_.SetDefault("-");
   output_.Check(WantsJson());
@@ -67,9 +80,7 @@ Outcome ExchangeCommand::Run(const Console& console) {
   setup.holderOfKey = key_.Load(mayBeOpen_);
   const Token own = ReadBoundToken(file_, mayBeOpen_, *signers, *setup.holderOfKey);
   const TokenSpec spec = request_.MakeSpec(mayBeOpen_);
-  const Token token = RunCall<Token>(console, setup, [own, spec](const auto& service) {
-    return service.AcquireTokenByToken(*own, spec);
-  });
+  const Token token = Exchange(console, setup, own, spec);
   const auto deviations = FindDeviations(*token, spec, request_.WantsBearer());
   return output_.Deliver(console, *token, deviations, WantsJson());
 }

@@ -31,6 +31,7 @@ class LoginCommand final : public Command {
   void CheckLogin() const;
   ServiceSetup MakeSetup() const;
   Token Login(const Console& console, const ServiceSetup& setup, const TokenSpec& spec) const;
+  Token LoginByAny(const Console& console, const ServiceSetup& setup, const TokenSpec& spec) const;
   Token LoginByPassword(const Console& console, ServiceSetup setup, const TokenSpec& spec) const;
 
   ServiceOptions service_;
@@ -56,12 +57,13 @@ CLI::App* LoginCommand::AddTo(CLI::App& program) {
              "    --user alice@EXAMPLE.COM --output token.xml");
   service_.AddConnectionTo(*command);
   service_.AddSignersTo(*command);
+  const std::string group = "Login";
   CLI::Option* const user =
       command->add_option("--user", user_, "Log in with this user name and a password");
-  user->type_name("NAME");
-  password_.AddTo(*command, "password");
+  user->type_name("NAME")->group(group);
+  password_.AddTo(*command, "password", group);
+  kerberos_.AddTo(*command, group)->excludes(user);
   key_.AddTo(*command, false);
-  kerberos_.AddTo(*command)->excludes(user);
   request_.AddTo(*command);
   request_.AddConfirmationTo(*command);
   output_.AddTo(*command,
@@ -116,6 +118,15 @@ Token LoginCommand::LoginByPassword(const Console& console, ServiceSetup setup,
 
 Token LoginCommand::Login(const Console& console, const ServiceSetup& setup,
                           const TokenSpec& spec) const {
+  try {
+    return LoginByAny(console, setup, spec);
+  } catch (const ToolException& exception) {
+    RethrowWithRemedy(exception, spec, nullptr);
+  }
+}
+
+Token LoginCommand::LoginByAny(const Console& console, const ServiceSetup& setup,
+                               const TokenSpec& spec) const {
   if (kerberos_.IsGiven()) {
     return RunCall<Token>(console, setup,
                           [handler = kerberos_.MakeHandler(setup.address.host),

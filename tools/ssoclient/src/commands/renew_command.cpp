@@ -39,7 +39,7 @@ class RenewCommand final : public Command {
 CLI::App* RenewCommand::AddTo(CLI::App& program) {
   CLI::App* const command = program.add_subcommand(
       "renew",
-      "Renew a token, in its file unless another one is named\n"
+      "Renew a token, in its file or another one\n"
       "Asks the service for the token with a new lifetime from now. The token must be renewable "
       "and bound to the key of --certificate. Readers of the file see the old or the new token, "
       "and if anything fails, the old one remains.");

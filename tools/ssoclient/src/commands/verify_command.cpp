@@ -33,8 +33,8 @@ CLI::App* VerifyCommand::AddTo(CLI::App& program) {
       "certificates cannot be read. The service that issued the token is not asked: "
       "'ssoclient validate' does that.");
   SetExample(*command,
-             "ssoclient verify --trust sts-signing.pem --tls-certificate caller.pem \\\n"
-             "  --audience https://orders.example.com token.xml");
+             "ssoclient verify --sts-certificate sts.pem --tls-certificate caller.pem \\\n"
+             "    --audience https://orders.example.com token.xml");
   command->add_option("FILE", file_, "The token; - for standard input")->required();
   gate_.AddTo(*command);
   presenter_.AddTo(*command);

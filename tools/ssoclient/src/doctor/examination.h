@@ -30,20 +30,24 @@ struct Plan {
   std::string peerName{};
   std::vector<std::string> caFiles{};
   std::vector<std::string> crlFiles{};
-  std::string stsCertificateFile{};
+  std::vector<std::string> stsCertificateFiles{};
   std::string user{};
   std::string certificateFile{};
+  /// May be that of the certificate; empty if the key is not in a file.
   std::string keyFile{};
   std::string kerberosService{};
   std::string principal{};
+  std::string credentialCache{};
   std::string keytab{};
   std::chrono::milliseconds timeout{30000};
   LoginKind login = LoginKind::kNone;
   /// The TLS trust of the options. Throws an exception when it cannot be made.
   std::function<Tarnik::Ref<Tarnik::Ssl::SSLContext>()> makeSslContext{};
-  /// The password, and the passphrase of the key. May ask the user; throw `ToolException`.
+  /// The password. May ask the user; throws `ToolException`.
   std::function<SecretText()> readPassword{};
-  std::function<SecretText()> readPassphrase{};
+  /// The key and its certificate, whose files, and that of the passphrase, others may read only if
+  /// the argument is true. May ask the user for a passphrase; throws `ToolException`.
+  std::function<HolderOfKeyConfig(bool mayBeOpen)> loadIdentity{};
 };
 
 /// The parts of the URL.

@@ -63,7 +63,9 @@ Finding JudgeLoginFailure(const std::exception& failure, const std::vector<Claim
   }
   const Tool::Failure other = FailureOf(failure);
   const bool isOwn = dynamic_cast<const ToolException*>(&failure) != nullptr;
-  return Failure(other.status, isOwn ? other.kind : "login-failed", other.message, other.remedy);
+  return Failure(
+      other.status, isOwn ? other.kind : "login-failed", other.message,
+      other.remedy.empty() ? "check the user name and the files of the login" : other.remedy);
 }
 
 }  // namespace SsoClient::Tool::Doctor

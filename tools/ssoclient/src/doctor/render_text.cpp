@@ -3,9 +3,8 @@
 #include <cstdio>
 #include <ostream>
 
-#include <tarnik/text/display_text.h>
-
 #include "doctor/render.h"
+#include "output/safe_text.h"
 
 namespace SsoClient::Tool::Doctor {
 namespace {
@@ -22,12 +21,6 @@ Colour ColourOf(StepOutcome outcome) {
       break;
   }
   return Colour::kFaint;
-}
-
-// Texts may contain file names.
-std::string Shown(const std::string& text) {
-  constexpr std::size_t kLongest = 4000;
-  return Tarnik::ToDisplayText(text, kLongest);
 }
 
 std::string Padded(std::string text, std::size_t width) {
@@ -51,19 +44,21 @@ void PrintStep(const Console& console, const Step& step) {
       finding.outcome == StepOutcome::kFailed || finding.outcome == StepOutcome::kWarning;
   console.out << console.Paint(ColourOf(finding.outcome), Padded(NameOf(finding.outcome), 8))
               << Padded(step.name, 12) << DurationText(step) << "  "
-              << (isProblem ? finding.name + ": " : "") << Shown(finding.message) << '\n';
+              << (isProblem ? finding.name + ": " : "") << SafeText(console, finding.message)
+              << '\n';
   for (const std::string& line : step.lines) {
-    console.out << std::string(10, ' ') << console.Paint(Colour::kFaint, Shown(line)) << '\n';
+    console.out << std::string(10, ' ') << console.Paint(Colour::kFaint, SafeText(console, line))
+                << '\n';
   }
   if (!finding.remedy.empty()) {
-    console.out << std::string(8, ' ') << "remedy: " << Shown(finding.remedy) << '\n';
+    console.out << std::string(8, ' ') << "remedy: " << SafeText(console, finding.remedy) << '\n';
   }
 }
 
 }  // namespace
 
 void PrintReport(const Console& console, const Report& report) {
-  console.out << console.Paint(Colour::kStrong, Shown(report.url)) << '\n';
+  console.out << console.Paint(Colour::kStrong, SafeText(console, report.url)) << '\n';
   for (const Step& step : report.steps) {
     PrintStep(console, step);
   }
@@ -76,8 +71,8 @@ void PrintReport(const Console& console, const Report& report) {
   const bool isFailure = cause->finding.outcome == StepOutcome::kFailed;
   console.out << console.Paint(ColourOf(cause->finding.outcome),
                                isFailure ? "first cause: " : "no failure; first warning: ")
-              << Shown(cause->finding.message) << '\n';
-  console.out << "remedy: " << Shown(cause->finding.remedy) << '\n';
+              << SafeText(console, cause->finding.message) << '\n';
+  console.out << "remedy: " << SafeText(console, cause->finding.remedy) << '\n';
 }
 
 }  // namespace SsoClient::Tool::Doctor

@@ -48,6 +48,10 @@ const Step* BlockerOf(const Entry& entry, const Report& report) {
   return found != report.steps.end() ? &*found : nullptr;
 }
 
+constexpr const char* kLocalRemedy =
+    "check what this machine has left of memory, descriptors and threads, and the limits of the "
+    "process";
+
 Step RunStep(const Entry& entry, Examination& examination) {
   const auto begin = TimeLimit::Clock::now();
   Step step;
@@ -55,8 +59,9 @@ Step RunStep(const Entry& entry, Examination& examination) {
     step = entry.examine(examination);
   } catch (const std::exception& exception) {
     const Tool::Failure failure = FailureOf(exception);
-    step.finding = Failure(failure.status, failure.kind == "local" ? "local-failure" : failure.kind,
-                           failure.message, failure.remedy);
+    const bool isLocal = failure.kind == "local";
+    step.finding = Failure(failure.status, isLocal ? "local-failure" : failure.kind,
+                           failure.message, isLocal ? kLocalRemedy : failure.remedy);
   }
   step.duration =
       std::chrono::duration_cast<std::chrono::microseconds>(TimeLimit::Clock::now() - begin);

@@ -1,81 +1,84 @@
+#include <optional>
+#include <string>
+
 #include <tarnik/core/exception.h>
 #include <tarnik/crypto/certificate.h>
-#include <tarnik/crypto/private_key.h>
 
 #include "doctor/local_files.h"
 #include "doctor/steps.h"
+#include "failure.h"
 
 namespace SsoClient::Tool::Doctor {
 namespace {
 
 using Tarnik::Crypto::Certificate;
-using Tarnik::Crypto::PrivateKey;
 
-Tarnik::Ref<const PrivateKey> LoadKey(Examination& examination) {
-  const Plan& plan = examination.plan;
-  return Tarnik::Crypto::LoadPrivateKey(plan.keyFile, [&] {
-    const auto begin = TimeLimit::Clock::now();
-    const SecretText passphrase = plan.readPassphrase();
-    examination.limit.Extend(TimeLimit::Clock::now() - begin);
-    return passphrase.Text();
-  });
-}
-
-Finding BadFile(const char* name, const std::string& path, const std::exception& reason,
-                const char* remedy) {
-  return Failure(ExitStatus::kLocal, name, "'" + path + "': " + reason.what(), remedy);
-}
-
-void Load(Examination& examination, Step& step) {
-  const Plan& plan = examination.plan;
-  HolderOfKeyConfig identity;
-  try {
-    identity.certificate = Tarnik::Crypto::LoadPemOrDerCertificates(plan.certificateFile).front();
-  } catch (const Tarnik::Exception& reason) {
-    step.finding = BadFile("bad-certificate-file", plan.certificateFile, reason,
-                           "give the certificate of the login as PEM or DER");
-    return;
+// Whether the certificate can be read, if it has a file of its own.
+std::optional<Finding> CertificateProblem(const Plan& plan) {
+  if (plan.keyFile == plan.certificateFile) {
+    return std::nullopt;
   }
   try {
-    identity.privateKey = LoadKey(examination);
+    Tarnik::Crypto::LoadPemOrDerCertificates(plan.certificateFile);
+    return std::nullopt;
   } catch (const Tarnik::Exception& reason) {
-    step.finding = BadFile("bad-key-file", plan.keyFile, reason,
-                           "give the private key as PEM, and its passphrase if it has one");
-    return;
+    return Failure(ExitStatus::kLocal, "bad-certificate-file",
+                   "'" + plan.certificateFile + "': " + reason.what(),
+                   "give the certificate of the login as PEM or DER");
   }
-  if (!identity.privateKey->Matches(*identity.certificate)) {
-    step.finding = Failure(ExitStatus::kLocal, "key-mismatch",
-                           "the key of '" + plan.keyFile + "' does not belong to " +
-                               identity.certificate->SubjectName(),
-                           "give the key that the certificate was issued for");
-    return;
+}
+
+// Asking for a passphrase takes no time of the examination.
+HolderOfKeyConfig Load(Examination& examination, bool isOpen) {
+  const auto begin = TimeLimit::Clock::now();
+  HolderOfKeyConfig identity = examination.plan.loadIdentity(isOpen);
+  examination.limit.Extend(TimeLimit::Clock::now() - begin);
+  return identity;
+}
+
+Finding KeyProblem(const Tool::Failure& failure) {
+  return Failure(
+      failure.status, failure.kind == "key" ? "bad-key-file" : failure.kind, failure.message,
+      failure.remedy.empty() ? "give the key that the certificate was issued for" : failure.remedy);
+}
+
+void Show(Step& step, const Certificate& certificate) {
+  step.details = {{"subject", certificate.SubjectName()},
+                  {"notBefore", certificate.NotBefore().ToString()},
+                  {"notAfter", certificate.NotAfter().ToString()},
+                  {"fingerprint", Tarnik::Crypto::FingerprintText(certificate)}};
+  step.lines.push_back("certificate: " + certificate.SubjectName() + ", valid until " +
+                       certificate.NotAfter().ToString());
+}
+
+std::optional<Finding> FilesProblem(const Plan& plan) {
+  for (const std::string& path : {plan.certificateFile, plan.keyFile}) {
+    const std::optional<Finding> problem = path.empty() ? std::nullopt : FileProblem(path);
+    if (problem) {
+      return problem;
+    }
   }
-  examination.identity = identity;
-  step.details = {{"subject", identity.certificate->SubjectName()},
-                  {"notBefore", identity.certificate->NotBefore().ToString()},
-                  {"notAfter", identity.certificate->NotAfter().ToString()},
-                  {"fingerprint", Tarnik::Crypto::FingerprintText(*identity.certificate)}};
-  step.lines.push_back("certificate: " + identity.certificate->SubjectName() + ", valid until " +
-                       identity.certificate->NotAfter().ToString());
+  return CertificateProblem(plan);
 }
 
 Step ExamineIdentity(Examination& examination) {
   Step step;
   const Plan& plan = examination.plan;
-  for (const std::string& path : {plan.certificateFile, plan.keyFile}) {
-    if (const auto problem = FileProblem(path)) {
-      step.finding = *problem;
-      return step;
-    }
-  }
-  Load(examination, step);
-  if (step.finding.outcome == StepOutcome::kFailed) {
+  if (const auto problem = FilesProblem(plan)) {
+    step.finding = *problem;
     return step;
   }
-  const auto validity =
-      ValidityProblem("the certificate of the login", *examination.identity->certificate,
-                      Tarnik::System::GetUtcDateTime());
   const auto permission = PermissionProblem(plan.keyFile);
+  try {
+    examination.identity = Load(examination, permission.has_value());
+  } catch (const ToolException& exception) {
+    step.finding = KeyProblem(exception.What());
+    return step;
+  }
+  const Certificate& certificate = *examination.identity->certificate;
+  Show(step, certificate);
+  const auto validity = ValidityProblem("the certificate of the login", certificate,
+                                        Tarnik::System::GetUtcDateTime());
   step.finding = validity     ? *validity
                  : permission ? *permission
                               : Fine("the key belongs to the certificate");

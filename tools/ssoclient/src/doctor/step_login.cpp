@@ -98,6 +98,7 @@ class Login {
         plan.kerberosService.empty() ? "HTTP@" + examination_.target.host : plan.kerberosService;
     kerberos.principal = plan.principal;
     kerberos.keytab = plan.keytab;
+    kerberos.credentialCache = plan.credentialCache;
     handler_ = std::make_shared<NotingHandler>(CreateGssapiNegotiationHandler(kerberos));
     return Service()->AcquireTokenByGSS(MakeSpec(), *handler_);
 #else

@@ -75,16 +75,17 @@ void ExamineList(Step& step, const std::string& path) {
   }
 }
 
-void ExamineSigners(Step& step, Examination& examination, const Tarnik::System::DateTime& now) {
-  const std::string& path = examination.plan.stsCertificateFile;
+void ExamineSigners(Step& step, Examination& examination, const std::string& path,
+                    const Tarnik::System::DateTime& now) {
   if (const auto problem = FileProblem(path)) {
     Note(step, problem);
     return;
   }
   try {
-    examination.signers = Tarnik::Crypto::LoadPemOrDerCertificates(path);
-    Show(step, "signer", examination.signers);
-    for (const auto& signer : examination.signers) {
+    const auto signers = Tarnik::Crypto::LoadPemOrDerCertificates(path);
+    examination.signers.insert(examination.signers.end(), signers.begin(), signers.end());
+    Show(step, "signer", signers);
+    for (const auto& signer : signers) {
       auto problem =
           ValidityProblem("the signing certificate " + signer->SubjectName(), *signer, now);
       if (problem) {
@@ -109,8 +110,8 @@ Step ExamineTrust(Examination& examination) {
   for (const std::string& path : plan.crlFiles) {
     ExamineList(step, path);
   }
-  if (!plan.stsCertificateFile.empty()) {
-    ExamineSigners(step, examination, now);
+  for (const std::string& path : plan.stsCertificateFiles) {
+    ExamineSigners(step, examination, path, now);
   }
   if (step.finding.outcome == StepOutcome::kFailed) {
     return step;

@@ -17,6 +17,14 @@ constexpr std::size_t kMaxSecretBytes = 1024;
 // A file may contain more than the secret, such as a comment.
 constexpr std::size_t kMaxSecretFileBytes = std::size_t{64} * 1024;
 
+// The library's own texts contain the value, which may be the secret itself by mistake.
+std::string CheckDescriptor(const std::string& text) {
+  constexpr std::size_t kMostDigits = 9;
+  const bool isNumber = !text.empty() && text.size() <= kMostDigits &&
+                        text.find_first_not_of("0123456789") == std::string::npos;
+  return isNumber ? std::string() : "it must be the number of a descriptor";
+}
+
 // One byte at a time, since the rest belongs to others.
 SecretText ReadLine(int descriptor, const std::string& name) {
   SecretText line;
@@ -39,17 +47,18 @@ SecretText ReadLine(int descriptor, const std::string& name) {
 
 }  // namespace
 
-void SecretOption::AddTo(CLI::App& command, const std::string& name) {
+void SecretOption::AddTo(CLI::App& command, const std::string& name, const std::string& group) {
   name_ = name;
   CLI::Option* const file = command.add_option(
       "--" + name + "-file", file_, "Read the " + name + " from the first line of this file");
-  file->type_name("FILE");
+  file->type_name("FILE")->group(group);
   command
       .add_option("--" + name + "-fd", descriptor_,
                   "Read the " + name + " from the first line of this file descriptor")
-      ->check(CLI::NonNegativeNumber)
+      ->check(CheckDescriptor)
       ->type_name("NUMBER")
-      ->excludes(file);
+      ->excludes(file)
+      ->group(group);
 }
 
 SecretText SecretOption::ReadUnchecked(const std::string& prompt, bool mayBeOpen) const {

@@ -15,9 +15,9 @@ namespace SsoClient::Tool {
 /// the environment, which other processes can see.
 class SecretOption {
  public:
-  /// Adds --NAME-file and --NAME-fd, which exclude each other, to the command; `name` is
-  /// "password", for example. The object must live as long as the command.
-  void AddTo(CLI::App& command, const std::string& name);
+  /// Adds --NAME-file and --NAME-fd, which exclude each other, to this group of the command's help;
+  /// `name` is "password", for example. The object must live as long as the command.
+  void AddTo(CLI::App& command, const std::string& name, const std::string& group);
 
   bool IsGiven() const { return !file_.empty() || descriptor_ >= 0; }
 

@@ -1,12 +1,14 @@
 #include "options/gate_options.h"
 
 #include <chrono>
+#include <cstdlib>
 
 #include <CLI/CLI.hpp>
 
 #include <tarnik/core/exception.h>
 
 #include "failure.h"
+#include "options/duration_checks.h"
 #include "output/duration_text.h"
 
 namespace SsoClient::Tool {
@@ -14,14 +16,7 @@ namespace {
 
 using Tarnik::System::DateTime;
 
-std::string CheckDuration(const std::string& text) {
-  return ParseDuration(text) ? "" : "'" + text + "' is not a duration such as 90s, 5m, 8h or 31d";
-}
-
-std::string CheckPositiveDuration(const std::string& text) {
-  const std::string failure = CheckDuration(text);
-  return failure.empty() && ParseDuration(text)->count() == 0 ? "it must not be 0" : failure;
-}
+constexpr const char* kTrustVariable = "SSOCLIENT_STS_CERTIFICATE";
 
 std::string CheckTimeText(const std::string& text) {
   try {
@@ -80,16 +75,16 @@ void GateOptions::AddTo(CLI::App& command) {
 }
 
 void GateOptions::AddTrustTo(CLI::App& command) {
-  CLI::Option* const trust =
-      AddRepeated(command, "--trust", trustPaths_,
-                  "Certificates that may sign tokens: a file, or a folder of them. Without "
-                  "--issuer they may sign in the name of every issuer")
-          ->type_name("PATH")
-          ->group("Trust");
-  command.add_option("--issuer", issuer_, "The only issuer that --trust is for")
+  AddRepeated(command, "--sts-certificate", trustPaths_,
+              "Certificates that the service signs tokens with: a file in PEM or DER, or a "
+              "folder of them. Without --issuer they may sign in the name of every issuer. "
+              "Without this option and --trust-for, the file is that of the variable " +
+                  std::string(kTrustVariable))
+      ->type_name("PATH")
+      ->group("Trust");
+  command.add_option("--issuer", issuer_, "The only issuer that --sts-certificate is for")
       ->type_name("NAME")
       ->check(CheckFilled)
-      ->needs(trust)
       ->group("Trust");
   command
       .add_option("--trust-for", pathsOfIssuers_,
@@ -138,14 +133,14 @@ void GateOptions::AddLimitsTo(CLI::App& command) {
   command
       .add_option("--clock-tolerance", clockTolerance_,
                   "By how much clocks may differ, such as 90s or 5m")
-      ->type_name("TIME")
+      ->type_name("DURATION")
       ->capture_default_str()
       ->check(CheckDuration)
       ->group("Limit");
   command
       .add_option("--longest-lifetime", longestLifetime_,
                   "How long a token may be valid from its start to its end")
-      ->type_name("TIME")
+      ->type_name("DURATION")
       ->capture_default_str()
       ->check(CheckPositiveDuration)
       ->group("Limit");
@@ -171,13 +166,25 @@ void GateOptions::AddLimitsTo(CLI::App& command) {
       ->group("Limit");
 }
 
+// The variable never adds to what --trust-for restricts.
+std::vector<std::string> GateOptions::TrustPaths() const {
+  const char* const variable = std::getenv(kTrustVariable);
+  const bool isVariable = trustPaths_.empty() && pathsOfIssuers_.empty() && variable != nullptr;
+  return isVariable && *variable != '\0' ? std::vector<std::string>{variable} : trustPaths_;
+}
+
 std::vector<Access::TrustedIssuer> GateOptions::Issuers() const {
   std::vector<Access::TrustedIssuer> issuers;
-  if (!trustPaths_.empty()) {
+  const std::vector<std::string> paths = TrustPaths();
+  if (paths.empty() && !issuer_.empty()) {
+    throw ToolException({ExitStatus::kUsage, "no-trust", "--issuer is for --sts-certificate",
+                         "use --trust-for, or --sts-certificate"});
+  }
+  if (!paths.empty()) {
     Access::TrustedIssuer& entry = issuers.emplace_back();
     entry.issuer = issuer_;
     entry.isForAnyIssuer = issuer_.empty();
-    entry.certificatePaths = trustPaths_;
+    entry.certificatePaths = paths;
   }
   for (const auto& [issuer, path] : pathsOfIssuers_) {
     Access::TrustedIssuer& entry = issuers.emplace_back();
@@ -196,14 +203,16 @@ std::shared_ptr<Access::TrustStore> GateOptions::MakeTrust() const {
   config.issuers = Issuers();
   config.isWatching = false;
   if (config.issuers.empty()) {
-    throw ToolException({ExitStatus::kUsage, "no-trust", "there is nobody who may sign tokens",
-                         "name the certificate of the service's signing key with --trust"});
+    throw ToolException(
+        {ExitStatus::kUsage, "no-trust", "there is nobody who may sign tokens",
+         "name the certificate of the service's signing key with --sts-certificate"});
   }
   try {
     return Access::CreateTrustStore(std::move(config));
   } catch (const Tarnik::Exception& exception) {
-    throw ToolException({ExitStatus::kLocal, "trust-files", exception.what(),
-                         "check the files of --trust, --trust-for, --crl and --list-signer"});
+    throw ToolException(
+        {ExitStatus::kLocal, "trust-files", exception.what(),
+         "check the files of --sts-certificate, --trust-for, --crl and --list-signer"});
   }
 }
 

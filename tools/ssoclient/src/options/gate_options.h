@@ -34,6 +34,7 @@ class GateOptions {
   void AddTrustTo(CLI::App& command);
   void AddPolicyTo(CLI::App& command);
   void AddLimitsTo(CLI::App& command);
+  std::vector<std::string> TrustPaths() const;
   std::vector<Access::TrustedIssuer> Issuers() const;
   std::shared_ptr<Access::TrustStore> MakeTrust() const;
 

@@ -46,26 +46,31 @@ std::shared_ptr<NegotiationHandler> Create(const GssapiNegotiationConfig& config
 
 }  // namespace
 
-CLI::Option* KerberosOptions::AddTo(CLI::App& command) {
+CLI::Option* KerberosOptions::AddTo(CLI::App& command, const std::string& group) {
   CLI::Option* const kerberos =
-      command.add_flag("--kerberos", isGiven_, "Log in with Kerberos tickets or a keytab");
+      command.add_flag("--kerberos", isGiven_, "Log in with Kerberos tickets or a keytab")
+          ->group(group);
   command
       .add_option("--service", service_,
                   "The service's Kerberos name; without it, HTTP@ and the host of --url")
       ->type_name("SERVICE@HOST")
-      ->needs(kerberos);
+      ->needs(kerberos)
+      ->group(group);
   command
       .add_option("--principal", principal_,
                   "Who logs in; without it, the owner of the tickets, or the first in the keytab")
       ->type_name("NAME")
-      ->needs(kerberos);
+      ->needs(kerberos)
+      ->group(group);
   command
       .add_option("--ccache", credentialCache_, "The credential cache; without it, the default one")
       ->type_name("CACHE")
-      ->needs(kerberos);
+      ->needs(kerberos)
+      ->group(group);
   command.add_option("--keytab", keytab_, "Get tickets with the keys of this keytab")
       ->type_name("FILE")
-      ->needs(kerberos);
+      ->needs(kerberos)
+      ->group(group);
   return kerberos;
 }
 

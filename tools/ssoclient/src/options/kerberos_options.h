@@ -16,11 +16,16 @@ namespace SsoClient::Tool {
 /// A login with Kerberos tickets or a keytab.
 class KerberosOptions {
  public:
-  /// Adds --kerberos, and --service, --principal, --ccache and --keytab, which need it. Returns the
-  /// first.
-  CLI::Option* AddTo(CLI::App& command);
+  /// Adds --kerberos, and --service, --principal, --ccache and --keytab, which need it, to this
+  /// group of the command's help. Returns the first.
+  CLI::Option* AddTo(CLI::App& command, const std::string& group);
 
   bool IsGiven() const { return isGiven_; }
+  /// The values of the options, which may be empty.
+  const std::string& Service() const { return service_; }
+  const std::string& Principal() const { return principal_; }
+  const std::string& CredentialCache() const { return credentialCache_; }
+  const std::string& Keytab() const { return keytab_; }
 
   /// Creates the legs of a login to the service on `host`, which --service replaces. Failures of
   /// Kerberos are `ToolException`s of the kind "kerberos". Throws `ToolException` for a malformed

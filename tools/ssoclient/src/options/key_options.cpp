@@ -81,7 +81,7 @@ auto Named(const std::string& name, const Load& load) {
 
 }  // namespace
 
-void KeyOptions::AddTo(CLI::App& command, bool isRequired) {
+CLI::Option* KeyOptions::AddTo(CLI::App& command, bool isRequired) {
   const std::string group = "Key";
   CLI::Option* const certificate = command.add_option(
       "--certificate", certificate_,
@@ -94,7 +94,15 @@ void KeyOptions::AddTo(CLI::App& command, bool isRequired) {
       ->type_name("FILE|URI")
       ->needs(certificate)
       ->group(group);
-  passphrase_.AddTo(command, "passphrase");
+  passphrase_.AddTo(command, "passphrase", group);
+  return certificate;
+}
+
+std::string KeyOptions::KeyFile() const {
+  if (key_.empty()) {
+    return certificate_;
+  }
+  return IsUri(key_) ? std::string() : key_;
 }
 
 Tarnik::Crypto::PassphraseCallback KeyOptions::AskPassphrase(const std::string& of,

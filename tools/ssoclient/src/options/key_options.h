@@ -9,18 +9,25 @@
 
 namespace CLI {
 class App;
-}
+class Option;
+}  // namespace CLI
 
 namespace SsoClient::Tool {
 
 /// The key of the user and its certificate.
 class KeyOptions {
  public:
-  /// Adds --certificate, --key, --passphrase-file and --passphrase-fd to the command. The object
-  /// must live as long as the command.
-  void AddTo(CLI::App& command, bool isRequired);
+  /// Adds --certificate, --key, --passphrase-file and --passphrase-fd to the command, and returns
+  /// the first. The object must live as long as the command.
+  CLI::Option* AddTo(CLI::App& command, bool isRequired);
 
   bool IsGiven() const { return !certificate_.empty() || !key_.empty(); }
+
+  /// The file of --certificate.
+  const std::string& CertificateFile() const { return certificate_; }
+  /// The file that contains the key: that of --key, or else of --certificate. Empty if the key has
+  /// a URI.
+  std::string KeyFile() const;
 
   /// The key and its certificate: from a PKCS#12 file, from a PEM file that has both, or from a
   /// certificate file and a key, which is in a PEM or PKCS#12 file or has a URI. Asks for a

@@ -1,57 +1,27 @@
 #include "options/request_options.h"
 
-#include <charconv>
-
 #include <CLI/CLI.hpp>
 
 #include "input/token_file.h"
+#include "options/duration_checks.h"
+#include "output/duration_text.h"
 #include "token/unverified_token.h"
 
 namespace SsoClient::Tool {
 namespace {
 
 constexpr const char* kDefaultLifetime = "1h";
-constexpr std::int64_t kLongestLifetimeSec = std::int64_t{36500} * 24 * 3600;
-
-std::optional<std::int64_t> SecondsIn(std::string_view unit) {
-  if (unit.empty() || unit == "s") {
-    return 1;
-  }
-  if (unit == "m" || unit == "min") {
-    return 60;
-  }
-  if (unit == "h") {
-    return 3600;
-  }
-  return unit == "d" ? std::optional<std::int64_t>(24 * 3600) : std::nullopt;
-}
 
 }  // namespace
 
-std::optional<std::int64_t> ParseLifetime(std::string_view text) {
-  std::int64_t number = 0;
-  const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-  const auto unit = SecondsIn(text.substr(static_cast<std::size_t>(end - text.data())));
-  if (error != std::errc() || !unit || number <= 0 || number > kLongestLifetimeSec / *unit) {
-    return std::nullopt;
-  }
-  return number * *unit;
-}
-
 void AddLifetimeOption(CLI::App& command, std::int64_t& seconds) {
-  seconds = ParseLifetime(kDefaultLifetime).value();
+  seconds = ParseDuration(kDefaultLifetime).value().count();
   command
       .add_option_function<std::string>(
           "--lifetime",
-          [&seconds](const std::string& text) {
-            const auto parsed = ParseLifetime(text);
-            if (!parsed) {
-              throw CLI::ValidationError("--lifetime",
-                                         "it must be a duration such as 3600, 90s, 30m, 8h or 7d");
-            }
-            seconds = *parsed;
-          },
-          "How long the token is to be valid: seconds, or a number with s, m, h or d")
+          [&seconds](const std::string& text) { seconds = ParseDuration(text).value().count(); },
+          "How long the token is to be valid, such as 90s, 30m, 8h or 7d")
+      ->check(CheckPositiveDuration)
       ->type_name("DURATION")
       ->default_str(kDefaultLifetime);
 }
@@ -68,9 +38,10 @@ void RequestOptions::AddTo(CLI::App& command) {
   command.add_option("--delegate-to", delegateTo_, "Delegate the token to this principal")
       ->type_name("NAME");
   command
-      .add_option("--act-as", actAsFile_,
-                  "Ask for a token on behalf of the subject of the token in this file; - for "
-                  "standard input")
+      .add_option(
+          "--act-as", actAsFile_,
+          "Ask for a token on behalf of the subject of the token in this file, which must be "
+          "delegable; - for standard input")
       ->type_name("FILE");
 }
 
@@ -97,6 +68,20 @@ TokenSpec RequestOptions::MakeSpec(bool mayBeOpen) const {
     spec.actAsToken = ReadUnverifiedToken(ReadTokenFile(actAsFile_, mayBeOpen).Text());
   }
   return spec;
+}
+
+void RethrowWithRemedy(const ToolException& exception, const TokenSpec& spec,
+                       const SamlToken* own) {
+  Failure failure = exception.What();
+  const bool isRefused = failure.status == ExitStatus::kRefused;
+  if (isRefused && spec.actAsToken && !(*spec.actAsToken)->IsDelegable()) {
+    failure.remedy =
+        "the token of --act-as is not delegable: its owner has to log in with --delegable";
+  } else if (isRefused && own != nullptr && !own->IsDelegable() &&
+             (spec.delegable || spec.delegateTo)) {
+    failure.remedy = "the token is not delegable: log in with --delegable";
+  }
+  throw ToolException(failure);
 }
 
 }  // namespace SsoClient::Tool

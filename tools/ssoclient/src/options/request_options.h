@@ -2,12 +2,13 @@
 #define SSOCLIENT_TOOL_OPTIONS_REQUEST_OPTIONS_H
 
 #include <cstdint>
-#include <optional>
 #include <string>
-#include <string_view>
 #include <vector>
 
+#include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>
+
+#include "failure.h"
 
 namespace CLI {
 class App;
@@ -15,11 +16,7 @@ class App;
 
 namespace SsoClient::Tool {
 
-/// The seconds of a duration such as "3600", "90s", "30m", "8h" or "7d"; none for any other text,
-/// for nothing and for more than a hundred years.
-std::optional<std::int64_t> ParseLifetime(std::string_view text);
-
-/// Adds --lifetime to the command. `seconds` is then in the range of `ParseLifetime`.
+/// Adds --lifetime to the command. `seconds` is then positive and in the range of `ParseDuration`.
 void AddLifetimeOption(CLI::App& command, std::int64_t& seconds);
 
 /// The token that is requested.
@@ -47,6 +44,11 @@ class RequestOptions {
   bool isBearer_ = false;
   bool isHolderOfKey_ = false;
 };
+
+/// Throws a failure of the request again. If the service has refused it because a token that it is
+/// based on is not delegable, the remedy says so. `own` is the token that is exchanged, or null.
+[[noreturn]] void RethrowWithRemedy(const ToolException& exception, const TokenSpec& spec,
+                                    const SamlToken* own);
 
 }  // namespace SsoClient::Tool
 

@@ -9,6 +9,18 @@
 
 namespace SsoClient::Tool {
 
+void AddSignersOption(CLI::App& command, std::vector<std::string>& files) {
+  command
+      .add_option(
+          "--sts-certificate", files,
+          "A file of certificates, in PEM or DER, that the service signs tokens with; may be "
+          "repeated")
+      ->envname("SSOCLIENT_STS_CERTIFICATE")
+      ->type_name("FILE")
+      ->allow_extra_args(false)
+      ->group("Connection");
+}
+
 void ServiceOptions::AddConnectionTo(CLI::App& command) {
   connection_.AddTo(command);
   command
@@ -18,15 +30,7 @@ void ServiceOptions::AddConnectionTo(CLI::App& command) {
 }
 
 void ServiceOptions::AddSignersTo(CLI::App& command) {
-  command
-      .add_option(
-          "--sts-certificate", signerFiles_,
-          "A file of certificates, in PEM or DER, that the service signs tokens with; may be "
-          "repeated")
-      ->envname("SSOCLIENT_STS_CERTIFICATE")
-      ->type_name("FILE")
-      ->allow_extra_args(false)
-      ->group("Connection");
+  AddSignersOption(command, signerFiles_);
 }
 
 Tarnik::Ref<const Tarnik::Xml::Security::KeyInfoResolver> ServiceOptions::Signers() const {

@@ -16,6 +16,9 @@ class App;
 
 namespace SsoClient::Tool {
 
+/// Adds --sts-certificate, which may be repeated, to the command.
+void AddSignersOption(CLI::App& command, std::vector<std::string>& files);
+
 /// The service that a command calls: its address, its trust and the keys of its tokens.
 class ServiceOptions {
  public:

@@ -13,7 +13,7 @@ struct Unit {
 };
 
 constexpr std::array<Unit, 4> kUnits{{{"d", 86400}, {"h", 3600}, {"min", 60}, {"s", 1}}};
-constexpr long kLongestSeconds = 1000L * 366 * 86400;
+constexpr long kLongestSeconds = 36500L * 86400;
 
 std::string Part(long count, const Unit& unit) {
   return std::to_string(count) + " " + unit.name;

@@ -16,7 +16,7 @@ std::string DurationText(std::chrono::seconds duration);
 
 /// The reverse for the command line: a whole number and one of the units "s", "m" or "min",
 /// "h" and "d", or seconds without a unit, such as "90", "5m" and "31d". None for anything else and
-/// for more than a thousand years.
+/// for more than 36500 days.
 std::optional<std::chrono::seconds> ParseDuration(std::string_view text);
 
 /// The time to the second, such as "2026-11-22 16:30:00 UTC".

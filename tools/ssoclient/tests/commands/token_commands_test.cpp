@@ -101,6 +101,21 @@ TEST_F(TokenCommandsTest, ExchangeActsOnBehalfOfTheSubjectOfAToken) {
   EXPECT_EQ(result.Json()["deviations"], nlohmann::json::array());
 }
 
+TEST_F(TokenCommandsTest, ATokenThatIsNotDelegableIsTheRemedyOfARefusal) {
+  const std::string own = LogIn("own", KeyLogin());
+  const std::string alice = LogIn("alice", PasswordLogin());
+  const auto remedy = [this](const std::vector<std::string>& arguments) {
+    const ToolResult result = RunTool(Joined(arguments, {"-o", PathOf("new"), "--json"}));
+    EXPECT_EQ(result.status, 1) << result.out;
+    return result.Json()["error"]["remedy"].get<std::string>();
+  };
+  const char* const ofActAs = "the token of --act-as is not delegable";
+  EXPECT_THAT(remedy(WithKey("exchange", {"--act-as", alice, own})), HasSubstr(ofActAs));
+  EXPECT_THAT(remedy(KeyLogin({"--act-as", alice})), HasSubstr(ofActAs));
+  EXPECT_THAT(remedy(WithKey("exchange", {"--delegate-to", "bob@EXAMPLE.COM", own})),
+              HasSubstr("the token is not delegable"));
+}
+
 TEST_F(TokenCommandsTest, ValidateSaysWhatTheServiceSays) {
   const std::string path = LogIn("token", PasswordLogin());
   const std::vector<std::string> command = UntrustedCommand("validate", {path});

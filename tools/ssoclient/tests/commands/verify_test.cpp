@@ -46,7 +46,7 @@ class VerifyTest : public ::testing::Test {
   using Arguments = std::vector<std::string>;
 
   Arguments Complete(Arguments options) const {
-    Arguments all{"verify", "--trust", trust, "--issuer", kTokenIssuer};
+    Arguments all{"verify", "--sts-certificate", trust, "--issuer", kTokenIssuer};
     all.insert(all.end(), options.begin(), options.end());
     return all;
   }
@@ -181,12 +181,30 @@ TEST_F(VerifyTest, TrustMayBeForOneIssuerOrForAny) {
     all.insert(all.end(), end.begin(), end.end());
     return RunInUtf8(all).status;
   };
-  EXPECT_EQ(run({"--trust", trust}), 0);
+  EXPECT_EQ(run({"--sts-certificate", trust}), 0);
   EXPECT_EQ(run({"--trust-for", kTokenIssuer, trust}), 0);
   EXPECT_EQ(run({"--trust-for", "https://other.example", trust}), 1);
   EXPECT_EQ(
       run({"--trust-for", "https://other.example", trust, "--trust-for", kTokenIssuer, trust}), 0);
-  EXPECT_EQ(run({"--trust", trust, "--issuer", "https://other.example"}), 1);
+  EXPECT_EQ(run({"--sts-certificate", trust, "--issuer", "https://other.example"}), 1);
+  EXPECT_EQ(run({"--issuer", kTokenIssuer}), 2);
+}
+
+TEST_F(VerifyTest, TheVariableIsUsedOnlyIfNoOptionNamesTrust) {
+  ToolOptions options;
+  options.environment = {{"SSOCLIENT_STS_CERTIFICATE", trust}};
+  const std::string path = files.WriteToken(AssertionText(), CredentialOf(Signer()));
+  const std::string other = files.Write("other.pem", Holder().Pem());
+  const auto run = [&](const Arguments& arguments) {
+    options.arguments = {"verify", "--audience", kTokenAudience, "--bearer", "accept", path};
+    options.arguments.insert(options.arguments.end(), arguments.begin(), arguments.end());
+    return RunTool(options).status;
+  };
+  EXPECT_EQ(run({}), 0);
+  EXPECT_EQ(run({"--issuer", kTokenIssuer}), 0);
+  EXPECT_EQ(run({"--issuer", "https://other.example"}), 1);
+  EXPECT_EQ(run({"--sts-certificate", other}), 1);
+  EXPECT_EQ(run({"--trust-for", "https://other.example", trust}), 1);
 }
 
 TEST_F(VerifyTest, CertificatesOfSignersHaveDates) {
@@ -198,8 +216,8 @@ TEST_F(VerifyTest, CertificatesOfSignersHaveDates) {
        {std::pair(&old, "signer-expired"), std::pair(&coming, "signer-not-yet-valid")}) {
     const std::string token = files.WriteToken(AssertionText(), CredentialOf(*identity));
     const ToolResult result =
-        RunInUtf8({"verify", "--trust", files.Write("signer.crt", identity->Pem()), "--audience",
-                   kTokenAudience, "--bearer", "accept", token});
+        RunInUtf8({"verify", "--sts-certificate", files.Write("signer.crt", identity->Pem()),
+                   "--audience", kTokenAudience, "--bearer", "accept", token});
     EXPECT_EQ(result.status, 1);
     EXPECT_TRUE(Holds(result.out, std::string("refused (") + reason + "): ")) << result.out;
   }
@@ -298,9 +316,10 @@ TEST_F(VerifyTest, GroupsMayBeRequired) {
 TEST_F(VerifyTest, TrustThatCannotBeReadIsALocalFailure) {
   const std::string token = files.WriteToken(AssertionText(), CredentialOf(Signer()));
   const std::string broken = files.Write("broken.pem", "no certificate");
-  for (const Arguments& options :
-       {Arguments{"--trust", "/nowhere/signer.pem"}, Arguments{"--trust", broken},
-        Arguments{"--trust", trust, "--crl", broken}, Arguments{"--trust-for", "x", broken}}) {
+  for (const Arguments& options : {Arguments{"--sts-certificate", "/nowhere/signer.pem"},
+                                   Arguments{"--sts-certificate", broken},
+                                   Arguments{"--sts-certificate", trust, "--crl", broken},
+                                   Arguments{"--trust-for", "x", broken}}) {
     Arguments all{"verify", "--audience", kTokenAudience, "--json", token};
     all.insert(all.begin() + 1, options.begin(), options.end());
     const ToolResult result = RunInUtf8(all);
@@ -316,22 +335,22 @@ TEST_F(VerifyTest, TrustThatCannotBeReadIsALocalFailure) {
 TEST_F(VerifyTest, ACommandLineMustMakeSense) {
   const std::string token = files.WriteToken(AssertionText(), CredentialOf(Signer()));
   for (const Arguments& options : {
-           Arguments{"--trust", trust},                    // no audience
-           Arguments{"--audience", "a"},                   // no trust
-           Arguments{"--audience", "a", "--issuer", "b"},  // of no trust
-           Arguments{"--audience", "", "--trust", trust},  //
-           Arguments{"--audience", "a", "--trust", trust, "--list-signer", trust},
-           Arguments{"--audience", "a", "--trust", trust, "--bearer", "maybe"},
-           Arguments{"--audience", "a", "--trust", trust, "--clock-tolerance", "-1"},
-           Arguments{"--audience", "a", "--trust", trust, "--longest-lifetime", "0"},
-           Arguments{"--audience", "a", "--trust", trust, "--deepest-delegation", "-1"},
-           Arguments{"--audience", "a", "--trust", trust, "--largest-token", "0"},
-           Arguments{"--audience", "a", "--trust", trust, "--group", "staff"},
-           Arguments{"--audience", "a", "--trust", trust, "--at", "noon"},
-           Arguments{"--audience", "a", "--trust", trust, "--proof-data", trust},
-           Arguments{"--audience", "a", "--trust", trust, "--proof-data", trust,
+           Arguments{"--sts-certificate", trust},                    // no audience
+           Arguments{"--audience", "a"},                             // no trust
+           Arguments{"--audience", "a", "--issuer", "b"},            // of no trust
+           Arguments{"--audience", "", "--sts-certificate", trust},  //
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--list-signer", trust},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--bearer", "maybe"},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--clock-tolerance", "-1"},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--longest-lifetime", "0"},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--deepest-delegation", "-1"},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--largest-token", "0"},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--group", "staff"},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--at", "noon"},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--proof-data", trust},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "--proof-data", trust,
                      "--proof-signature", trust, "--proof-algorithm", "md5"},
-           Arguments{"--audience", "a", "--trust", trust, "another"},
+           Arguments{"--audience", "a", "--sts-certificate", trust, "another"},
        }) {
     Arguments all{"verify", token};
     all.insert(all.end(), options.begin(), options.end());

@@ -126,9 +126,11 @@ TEST(DoctorFilesTest, AKeyThatOthersCanReadIsAWarning) {
 TEST(DoctorFilesTest, OptionsThatExcludeEachOtherAreWrong) {
   const std::vector<std::vector<std::string>> wrong = {
       {"doctor", "--url", kUrl, "--user", "a", "--kerberos"},
-      {"doctor", "--url", kUrl, "--certificate", "a"},
+      {"doctor", "--url", kUrl, "--user", "a", "--certificate", "a"},
+      {"doctor", "--url", kUrl, "--kerberos", "--certificate", "a"},
       {"doctor", "--url", kUrl, "--key", "a"},
       {"doctor", "--url", kUrl, "--keytab", "a"},
+      {"doctor", "--url", kUrl, "--ccache", "a"},
       {"doctor"},
   };
   for (const std::vector<std::string>& arguments : wrong) {

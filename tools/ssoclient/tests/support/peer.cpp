@@ -1,6 +1,7 @@
 #include "support/peer.h"
 
 #include <array>
+#include <cerrno>
 #include <memory>
 #include <stdexcept>
 
@@ -120,6 +121,10 @@ Peer::~Peer() {
   close(stop_[0]);
 }
 
+void Peer::StopListening() const {
+  shutdown(socket_.Number(), SHUT_RDWR);
+}
+
 void Peer::Run() {
   for (;;) {
     pollfd polled[] = {{socket_.Number(), POLLIN, 0}, {stop_[0], POLLIN, 0}};
@@ -130,6 +135,8 @@ void Peer::Run() {
     if (descriptor >= 0) {
       serve_(descriptor);
       close(descriptor);
+    } else if (errno == EINVAL) {
+      return;  // nobody listens any more
     }
   }
 }

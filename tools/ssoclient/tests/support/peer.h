@@ -52,6 +52,8 @@ class Peer {
   Peer& operator=(const Peer&) = delete;
 
   std::string Url() const { return socket_.Url(); }
+  /// Refuses further connections. `Serve` may call it.
+  void StopListening() const;
 
  private:
   void Run();

@@ -1,0 +1,112 @@
+// The forms in which the key of a login can be.
+#include <string>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
+#include <openssl/pkcs12.h>
+#include <sys/stat.h>
+
+#include "support/key_texts.h"
+#include "support/service_fixture.h"
+#include "support/test_pki.h"
+
+namespace SsoClient::Tool::Testing {
+namespace {
+
+using Tarnik::Testing::Identity;
+using testing::HasSubstr;
+using testing::Not;
+
+const std::string kPassphrase = "open-sesame";
+
+const Identity& TheIdentity() {
+  static const Identity identity =
+      Tarnik::Testing::MakeIdentity({.commonName = "robot", .rsaBits = 2048}, nullptr);
+  return identity;
+}
+
+std::string Pkcs12() {
+  const Tarnik::OpenSsl::OwnedPkcs12 made(
+      PKCS12_create(kPassphrase.c_str(), nullptr, TheIdentity().key.get(),
+                    TheIdentity().certificate.get(), nullptr, 0, 0, 100, 100, 0));
+  unsigned char* bytes = nullptr;
+  const int length = i2d_PKCS12(made.get(), &bytes);
+  const Tarnik::OpenSsl::OwnedMemory<unsigned char> owner(bytes);
+  return {reinterpret_cast<const char*>(bytes), static_cast<std::size_t>(length)};
+}
+
+class KeyOptionsTest : public ServiceTest {
+ protected:
+  KeyOptionsTest() {
+    Sts().RegisterCertificate("bob@EXAMPLE.COM", TheIdentity().Pem());
+    WritePrivate("robot.p12", Pkcs12());
+    WritePrivate("robot.pem", TheIdentity().Pem());
+    WritePrivate("robot.key", Tarnik::Testing::ToPkcs8Pem(TheIdentity().key.get(), &kPassphrase));
+    WritePrivate("both.pem", Content(PathOf("robot.key")) + TheIdentity().Pem());
+    WritePrivate("passphrase", kPassphrase + "\n");
+    WritePrivate("wrong", "another\n");
+  }
+
+  ToolResult Run(const std::string& command, const std::vector<std::string>& key,
+                 const std::string& passphrase) const {
+    return RunTool(
+        Command(command, Joined(key, {"--json", "--passphrase-file", PathOf(passphrase)})));
+  }
+  std::vector<std::vector<std::string>> Forms() const {
+    return {{"--certificate", PathOf("robot.p12")},
+            {"--certificate", PathOf("robot.pem"), "--key", PathOf("robot.key")},
+            {"--certificate", PathOf("robot.pem"), "--key", PathOf("robot.p12")},
+            {"--certificate", PathOf("both.pem")}};
+  }
+};
+
+TEST_F(KeyOptionsTest, ALoginReadsEachFormWithItsPassphrase) {
+  for (const auto& form : Forms()) {
+    const ToolResult result = Run("login", Joined(form, {"-o", PathOf("token")}), "passphrase");
+    ASSERT_EQ(result.status, 0) << result.out;
+    EXPECT_EQ(result.Json()["token"]["subject"]["name"], "bob");
+    EXPECT_EQ(result.Json()["token"]["confirmation"], "holder-of-key");
+  }
+}
+
+TEST_F(KeyOptionsTest, AWrongPassphraseIsLocalAndNotRepeated) {
+  for (const auto& form : Forms()) {
+    const ToolResult result = Run("login", Joined(form, {"-o", PathOf("token")}), "wrong");
+    EXPECT_EQ(result.status, 4);
+    EXPECT_EQ(result.Json()["error"]["kind"], "key") << result.out;
+    EXPECT_THAT(result.out + result.err, Not(HasSubstr("another")));
+  }
+  EXPECT_TRUE(Sts().Requests().empty());
+}
+
+TEST_F(KeyOptionsTest, APassphraseFileOfOthersIsRefused) {
+  chmod(PathOf("passphrase").c_str(), 0644);
+  const auto login = Joined(Forms().front(), {"-o", PathOf("token")});
+  for (const ToolResult& result :
+       {Run("login", login, "passphrase"), Run("doctor", Forms().front(), "passphrase")}) {
+    EXPECT_EQ(result.status, 4);
+    EXPECT_THAT(result.out, HasSubstr("\"passphrase-file-open\""));
+  }
+}
+
+TEST_F(KeyOptionsTest, DoctorLogsInWithWhatLoginAccepts) {
+  for (const auto& form : Forms()) {
+    const ToolResult result = Run("doctor", form, "passphrase");
+    EXPECT_EQ(result.status, 0) << result.out;
+    EXPECT_THAT(result.out, HasSubstr("bob@EXAMPLE.COM"));
+    const ToolResult wrong = Run("doctor", form, "wrong");
+    EXPECT_EQ(wrong.status, 4);
+    EXPECT_EQ(wrong.Json()["firstCause"]["finding"], "bad-key-file") << wrong.out;
+  }
+}
+
+TEST_F(KeyOptionsTest, DoctorFindsThatThereIsNoKey) {
+  const ToolResult result = Run("doctor", {"--certificate", PathOf("robot.pem")}, "passphrase");
+  EXPECT_EQ(result.status, 2);
+  EXPECT_EQ(result.Json()["firstCause"]["finding"], "no-key");
+}
+
+}  // namespace
+}  // namespace SsoClient::Tool::Testing
