@@ -11,7 +11,7 @@
 namespace SsoClient::Tool::Doctor {
 namespace {
 
-constexpr std::size_t kShownName = 256;
+constexpr std::size_t kShownSigner = 256;
 // A token whose times are refused still names its signer.
 constexpr long kAnyTime = 1000L * 365 * 24 * 3600;
 
@@ -62,7 +62,7 @@ std::vector<ClaimedSigner> ReadClaimedSigners(const std::string& text) {
     const auto token = CreateSamlToken(text, kAnyTime);
     for (const auto& der : token->GetSignature()->KeyInfo().certificates) {
       const auto certificate = Tarnik::Crypto::CreateCertificateFromDer(der.data(), der.size());
-      signers.push_back({Tarnik::ToDisplayText(certificate->SubjectName(), kShownName),
+      signers.push_back({Tarnik::ToDisplayText(certificate->SubjectName(), kShownSigner),
                          Tarnik::Crypto::FingerprintText(*certificate)});
     }
   } catch (const Tarnik::Exception&) {

@@ -41,8 +41,8 @@ HttpAnswer Exchange(const Examination& examination, TimeLimit::Clock::time_point
   const auto sent = Tarnik::System::GetUtcDateTime();
   request->BodyWriter()->Write(HarmlessRequest(sent));
 
-  constexpr unsigned long kMicroseconds = 1000;
-  const auto limit = static_cast<unsigned long>(MillisecondsUntil(end)) * kMicroseconds;
+  constexpr unsigned long kMicrosecondsOfMillisecond = 1000;
+  const auto limit = static_cast<unsigned long>(MillisecondsUntil(end)) * kMicrosecondsOfMillisecond;
   const auto item = agent->SendAsync(
       request.get(), [](Tarnik::Exception*, auto*, auto*) {}, limit + 1);
   const auto response = agent->Wait(item.get(), 0);

@@ -6,8 +6,8 @@
 namespace SsoClient::Tool::Doctor {
 namespace {
 
-constexpr std::size_t kShownName = 256;
-constexpr long kMicroseconds = 1000000;
+constexpr std::size_t kShownSubject = 256;
+constexpr long kMicrosecondsOfSecond = 1000000;
 // Clocks that are synchronised may still differ by some seconds.
 constexpr long kToleranceSec = 5;
 
@@ -15,8 +15,8 @@ constexpr long kToleranceSec = 5;
 
 Finding JudgeValidity(const Tarnik::System::DateTime& start, const Tarnik::System::DateTime& end,
                       const Tarnik::System::DateTime& now) {
-  const long untilStart = (start.GetUtcTime() - now.GetUtcTime()) / kMicroseconds;
-  const long untilEnd = (end.GetUtcTime() - now.GetUtcTime()) / kMicroseconds;
+  const long untilStart = (start.GetUtcTime() - now.GetUtcTime()) / kMicrosecondsOfSecond;
+  const long untilEnd = (end.GetUtcTime() - now.GetUtcTime()) / kMicrosecondsOfSecond;
   const char* remedy = "synchronise the clocks of this machine and the service";
   if (untilStart > kToleranceSec) {
     return Warning(ExitStatus::kLocal, "token-not-yet-valid",
@@ -43,8 +43,8 @@ Step ExamineToken(Examination& examination) {
   step.finding =
       JudgeValidity(token.StartTime(), token.ExpirationTime(), Tarnik::System::GetUtcDateTime());
   const std::string subject =
-      Tarnik::ToDisplayText(token.Subject().name + "@" + token.Subject().domain, kShownName);
-  const std::string issuer = Tarnik::ToDisplayText(token.Issuer(), kShownName);
+      Tarnik::ToDisplayText(token.Subject().name + "@" + token.Subject().domain, kShownSubject);
+  const std::string issuer = Tarnik::ToDisplayText(token.Issuer(), kShownSubject);
   step.lines = {
       "subject: " + subject, "issuer: " + issuer,
       "valid from " + token.StartTime().ToString() + " until " + token.ExpirationTime().ToString()};

@@ -35,7 +35,7 @@ void Note(Step& step, const std::optional<Finding>& problem) {
   }
 }
 
-Finding Unusable(const char* name, const std::string& path, const std::string& reason) {
+Finding UnusableFile(const char* name, const std::string& path, const std::string& reason) {
   return Failure(ExitStatus::kLocal, name, "'" + path + "': " + reason,
                  "give a PEM file (DER is possible only for --sts-certificate)");
 }
@@ -57,7 +57,7 @@ void ExamineCa(Step& step, const std::string& path, const Tarnik::System::DateTi
       Note(step, problem);
     }
   } catch (const Tarnik::Exception& unusable) {
-    Note(step, Unusable("bad-ca-file", path, unusable.what()));
+    Note(step, UnusableFile("bad-ca-file", path, unusable.what()));
   }
 }
 
@@ -71,7 +71,7 @@ void ExamineList(Step& step, const std::string& path) {
         "revocation lists: " + std::to_string(Tarnik::Crypto::LoadRevocationLists(path).size()) +
         " in '" + path + "'");
   } catch (const Tarnik::Exception& unusable) {
-    Note(step, Unusable("bad-revocation-list", path, unusable.what()));
+    Note(step, UnusableFile("bad-revocation-list", path, unusable.what()));
   }
 }
 
@@ -94,7 +94,7 @@ void ExamineSigners(Step& step, Examination& examination, const std::string& pat
       Note(step, problem);
     }
   } catch (const Tarnik::Exception& unusable) {
-    Note(step, Unusable("bad-sts-certificate", path, unusable.what()));
+    Note(step, UnusableFile("bad-sts-certificate", path, unusable.what()));
   }
 }
 

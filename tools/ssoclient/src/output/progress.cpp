@@ -9,12 +9,12 @@
 namespace SsoClient::Tool {
 namespace {
 
-constexpr std::size_t kDefaultColumns = 80;
+constexpr std::size_t kBarColumns = 80;
 
 std::size_t ColumnsOfTerminal() {
   winsize size{};
   const bool isKnown = ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 1;
-  return isKnown ? size.ws_col : kDefaultColumns;
+  return isKnown ? size.ws_col : kBarColumns;
 }
 
 }  // namespace
