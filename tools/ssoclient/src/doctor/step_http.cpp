@@ -42,7 +42,8 @@ HttpAnswer Exchange(const Examination& examination, TimeLimit::Clock::time_point
   request->BodyWriter()->Write(HarmlessRequest(sent));
 
   constexpr unsigned long kMicrosecondsOfMillisecond = 1000;
-  const auto limit = static_cast<unsigned long>(MillisecondsUntil(end)) * kMicrosecondsOfMillisecond;
+  const auto limit =
+      static_cast<unsigned long>(MillisecondsUntil(end)) * kMicrosecondsOfMillisecond;
   const auto item = agent->SendAsync(
       request.get(), [](Tarnik::Exception*, auto*, auto*) {}, limit + 1);
   const auto response = agent->Wait(item.get(), 0);

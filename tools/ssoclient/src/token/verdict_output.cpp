@@ -104,7 +104,8 @@ std::string OptionHint(Reason reason) {
       return "--at checks as of another time";
     case Reason::kUnknownIssuer:
     case Reason::kUnknownSigner:
-      return "compare the issuer and the signer in 'ssoclient show' with --trust and --issuer";
+      return "compare the issuer and the signer in 'ssoclient show' with --sts-certificate and "
+             "--issuer";
     case Reason::kRevocationUnknown:
       return "--crl must name a current list of the authority that issued the signer's certificate";
     case Reason::kWrongAudience:
