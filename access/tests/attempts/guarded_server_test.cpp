@@ -327,6 +327,23 @@ TEST_F(GuardedServerThreadTest, SurvivesGarbage) {
   EXPECT_EQ(Send(InHeader(HolderToken())).status, 200);
 }
 
+// Others may be able to compute such a key from its certificate.
+TEST_F(GuardedServerThreadTest, RefusesClientsWithShortKeys) {
+  Server();
+  const std::string request =
+      folder_.Write("request", "GET / HTTP/1.1\r\nConnection: close\r\n\r\n");
+  for (const auto& [bits, isAnswered] : {std::pair{"1024", false}, std::pair{"2048", true}}) {
+    const std::string key = folder_.Path() + "/client.pem";
+    const auto made = Tarnik::Testing::RunInShell(
+        "openssl req -x509 -nodes -subj /CN=a -newkey rsa:" + std::string(bits) + " -keyout " +
+        key + " -out " + key + ".crt 2>&1");
+    ASSERT_EQ(made.status, 0) << made.output;
+    const auto run = Tarnik::Testing::RunInShell(Client() + " -cipher DEFAULT@SECLEVEL=0 -key " +
+                                                 key + " -cert " + key + ".crt <" + request);
+    EXPECT_EQ(run.output.find("HTTP/1.1 401 ") != std::string::npos, isAnswered) << run.output;
+  }
+}
+
 TEST_F(GuardedServerThreadTest, EndsSlowConnections) {
   Server("refuse", {"300"});
   RawConnection silent(server_->Port());
