@@ -344,6 +344,35 @@ TEST_F(GuardedServerThreadTest, RefusesClientsWithShortKeys) {
   }
 }
 
+TEST_F(GuardedServerThreadTest, ReadsNoTokenFromATrailer) {
+  Server("accept");
+  const std::string field = "Authorization: Bearer " + Base64(BearerToken()) + "\r\n";
+  const std::string begin =
+      "POST / HTTP/1.1\r\nConnection: close\r\nTransfer-Encoding: chunked\r\n";
+  EXPECT_THAT(SendText(begin + field + "\r\n0\r\n\r\n"), HasSubstr("HTTP/1.1 200 "));
+  const std::string answer = SendText(begin + "\r\n0\r\n" + field + "\r\n");
+  EXPECT_THAT(answer, HasSubstr("HTTP/1.1 401 "));
+  EXPECT_THAT(answer, HasSubstr("WWW-Authenticate: Bearer\r\n"));
+}
+
+// Others could find another request, or none, in what follows.
+TEST_F(GuardedServerThreadTest, RefusesRequestsWithoutAClearEnd) {
+  Server();
+  const std::string next = "\r\n\r\nGET / HTTP/1.1\r\nConnection: close\r\n\r\n";
+  for (const char* const header :
+       {"1.1\r\nTransfer-Encoding: gzip", "1.1\r\nTransfer-Encoding: identity",
+        "1.1\r\nTransfer-Encoding: chunked, gzip",
+        "1.1\r\nTransfer-Encoding: gzip, chunked\r\n\r\n0",
+        "1.1\r\nTransfer-Encoding: gzip\r\nContent-Length: 0",
+        "1.1\r\nTransfer-Encoding: gzip\r\nTransfer-Encoding: chunked\r\n\r\n0",
+        "1.1\r\nTransfer-Encoding: chunked\r\nContent-Length: 0",
+        "1.0\r\nConnection: keep-alive\r\nTransfer-Encoding: chunked\r\n\r\n0"}) {
+    const std::string answer = SendText(std::string("POST / HTTP/") + header + next);
+    EXPECT_THAT(answer, HasSubstr(" 400 Bad Request\r\n")) << header;
+    EXPECT_EQ(answer.find(" 401 "), std::string::npos) << header;
+  }
+}
+
 TEST_F(GuardedServerThreadTest, EndsSlowConnections) {
   Server("refuse", {"300"});
   RawConnection silent(server_->Port());
