@@ -5,7 +5,6 @@
 #include <iostream>
 
 #include <boost/asio/dispatch.hpp>
-#include <boost/asio/redirect_error.hpp>
 #include <boost/asio/use_awaitable.hpp>
 #include <boost/beast/core/error.hpp>
 #include <boost/beast/http.hpp>
@@ -25,21 +24,6 @@ constexpr std::chrono::seconds kIdleLimit{60};  // until the next request begins
 constexpr std::chrono::seconds kEndLimit{1};    // for the client's end of TLS
 constexpr std::size_t kLargestHeader = std::size_t{64} * 1024;
 constexpr std::size_t kLargestBody = std::size_t{512} * 1024;
-
-/// The answer to what is no request, or too large; throws `error` when the connection has failed.
-Response AnswerTo(const beast::error_code& error) {
-  Response response(http::status::bad_request, 11);
-  response.keep_alive(false);
-  if (error == http::error::header_limit || error == http::error::buffer_overflow) {
-    response.result(http::status::request_header_fields_too_large);
-  } else if (error == http::error::body_limit) {
-    response.result(http::status::payload_too_large);
-  } else if (error.category() != make_error_code(http::error::bad_method).category() ||
-             error == http::error::end_of_stream || error == http::error::partial_message) {
-    throw beast::system_error(error);
-  }
-  return response;
-}
 
 }  // namespace
 
@@ -90,19 +74,32 @@ asio::awaitable<void> Connection::AwaitRequest() {
 }
 
 asio::awaitable<Response> Connection::ReadAndAnswer(const Presenter& presenter) {
+  try {
+    const Request request = co_await Read();
+    Response response = config_.guard->Answer(request, presenter, sender_);
+    response.keep_alive(request.keep_alive() && !isStopping_);
+    co_return response;
+  } catch (const beast::system_error& e) {
+    co_return AnswerTo(e.code());
+  }
+}
+
+asio::awaitable<Request> Connection::Read() {
   http::request_parser<http::string_body> parser;
   parser.header_limit(kLargestHeader);
   parser.body_limit(kLargestBody);
   SetTimeLimit(config_.timeLimit);
-  beast::error_code error;
-  co_await http::async_read(stream_, buffer_, parser,
-                            asio::redirect_error(asio::use_awaitable, error));
-  if (error) {
-    co_return AnswerTo(error);
+  co_await http::async_read_header(stream_, buffer_, parser, asio::use_awaitable);
+  const http::request_header<> header = parser.get().base();
+  if (!HasClearEnd(header)) {
+    throw beast::system_error(http::error::bad_transfer_encoding);
   }
-  Response response = config_.guard->Answer(parser.get(), presenter, sender_);
-  response.keep_alive(parser.get().keep_alive() && !isStopping_);
-  co_return response;
+  co_await http::async_read(stream_, buffer_, parser, asio::use_awaitable);
+  // The parser has added the fields of a trailer to those of the header, where a token must be
+  // (RFC 9110, section 6.5.1).
+  Request request = parser.release();
+  request.base() = header;
+  co_return request;
 }
 
 asio::awaitable<void> Connection::Send(Response& response) {

@@ -38,6 +38,7 @@ class Connection : public std::enable_shared_from_this<Connection> {
  private:
   boost::asio::awaitable<void> ServeRequests();
   boost::asio::awaitable<Response> ReadAndAnswer(const SsoClient::Access::Presenter& presenter);
+  boost::asio::awaitable<Request> Read();
   boost::asio::awaitable<void> Send(Response& response);
   boost::asio::awaitable<void> AwaitRequest();
   void SetTimeLimit(std::chrono::milliseconds limit);

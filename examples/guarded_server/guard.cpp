@@ -1,13 +1,19 @@
 #include "guard.h"
 
 #include <iostream>
+#include <iterator>
+
+#include <boost/beast/core/string.hpp>
 
 #include <tarnik/text/display_text.h>
 
 namespace GuardedServer {
+
+namespace beast = boost::beast;
+namespace http = beast::http;
+
 namespace {
 
-namespace http = boost::beast::http;
 using SsoClient::Access::Remedy;
 using SsoClient::Access::Verdict;
 
@@ -40,6 +46,26 @@ Response Refuse(const Request& request, const Verdict& verdict, const std::strin
 }
 
 }  // namespace
+
+bool HasClearEnd(const http::request_header<>& header) {
+  const auto [begin, end] = header.equal_range(http::field::transfer_encoding);
+  return begin == end || (header.version() == 11 && std::next(begin) == end &&
+                          beast::iequals(begin->value(), "chunked"));
+}
+
+Response AnswerTo(const beast::error_code& error) {
+  Response response(http::status::bad_request, 11);
+  response.keep_alive(false);
+  if (error == http::error::header_limit || error == http::error::buffer_overflow) {
+    response.result(http::status::request_header_fields_too_large);
+  } else if (error == http::error::body_limit) {
+    response.result(http::status::payload_too_large);
+  } else if (error.category() != make_error_code(http::error::bad_method).category() ||
+             error == http::error::end_of_stream || error == http::error::partial_message) {
+    throw beast::system_error(error);
+  }
+  return response;
+}
 
 Response Guard::Answer(const Request& request, const SsoClient::Access::Presenter& presenter,
                        const std::string& sender) const try {

@@ -16,10 +16,13 @@ std::shared_ptr<ssl::context> MakeTlsContext(const std::string& certificateFile,
   context->use_certificate_chain_file(certificateFile);
   context->use_private_key_file(keyFile, ssl::context::pem);
   context->set_verify_mode(ssl::verify_peer);
-  context->set_verify_callback([](bool, ssl::verify_context&) { return true; });
+  context->set_verify_callback([](bool, ssl::verify_context& verified) {
+    return X509_STORE_CTX_get_error(verified.native_handle()) != X509_V_ERR_EE_KEY_TOO_SMALL;
+  });
   // Every connection has a handshake of its own: no session is resumed, and none is renegotiated
   // with another certificate.
   SSL_CTX* const native = context->native_handle();
+  SSL_CTX_set_security_level(native, 2);  // RSA keys of 2048 bits
   SSL_CTX_set_min_proto_version(native, TLS1_2_VERSION);
   SSL_CTX_set_options(native, SSL_OP_NO_TICKET | SSL_OP_NO_RENEGOTIATION);
   SSL_CTX_set_session_cache_mode(native, SSL_SESS_CACHE_OFF);

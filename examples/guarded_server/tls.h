@@ -11,8 +11,9 @@
 namespace GuardedServer {
 
 /// TLS 1.2 and 1.3 with this certificate, which is sent with the others in its file. Clients are
-/// asked for a certificate. They may have none, or any: a handshake proves that the client has the
-/// certificate's key, and whether that matters is decided by its token.
+/// asked for a certificate. They may have none, or any whose key is not too short: a handshake
+/// proves that the client has the certificate's key, and whether that matters is decided by its
+/// token.
 std::shared_ptr<boost::asio::ssl::context> MakeTlsContext(const std::string& certificateFile,
                                                           const std::string& keyFile);
 

@@ -327,6 +327,52 @@ TEST_F(GuardedServerThreadTest, SurvivesGarbage) {
   EXPECT_EQ(Send(InHeader(HolderToken())).status, 200);
 }
 
+// Others may be able to compute such a key from its certificate.
+TEST_F(GuardedServerThreadTest, RefusesClientsWithShortKeys) {
+  Server();
+  const std::string request =
+      folder_.Write("request", "GET / HTTP/1.1\r\nConnection: close\r\n\r\n");
+  for (const auto& [bits, isAnswered] : {std::pair{"1024", false}, std::pair{"2048", true}}) {
+    const std::string key = folder_.Path() + "/client.pem";
+    const auto made = Tarnik::Testing::RunInShell(
+        "openssl req -x509 -nodes -subj /CN=a -newkey rsa:" + std::string(bits) + " -keyout " +
+        key + " -out " + key + ".crt 2>&1");
+    ASSERT_EQ(made.status, 0) << made.output;
+    const auto run = Tarnik::Testing::RunInShell(Client() + " -cipher DEFAULT@SECLEVEL=0 -key " +
+                                                 key + " -cert " + key + ".crt <" + request);
+    EXPECT_EQ(run.output.find("HTTP/1.1 401 ") != std::string::npos, isAnswered) << run.output;
+  }
+}
+
+TEST_F(GuardedServerThreadTest, ReadsNoTokenFromATrailer) {
+  Server("accept");
+  const std::string field = "Authorization: Bearer " + Base64(BearerToken()) + "\r\n";
+  const std::string begin =
+      "POST / HTTP/1.1\r\nConnection: close\r\nTransfer-Encoding: chunked\r\n";
+  EXPECT_THAT(SendText(begin + field + "\r\n0\r\n\r\n"), HasSubstr("HTTP/1.1 200 "));
+  const std::string answer = SendText(begin + "\r\n0\r\n" + field + "\r\n");
+  EXPECT_THAT(answer, HasSubstr("HTTP/1.1 401 "));
+  EXPECT_THAT(answer, HasSubstr("WWW-Authenticate: Bearer\r\n"));
+}
+
+// Others could find another request, or none, in what follows.
+TEST_F(GuardedServerThreadTest, RefusesRequestsWithoutAClearEnd) {
+  Server();
+  const std::string next = "\r\n\r\nGET / HTTP/1.1\r\nConnection: close\r\n\r\n";
+  for (const char* const header :
+       {"1.1\r\nTransfer-Encoding: gzip", "1.1\r\nTransfer-Encoding: identity",
+        "1.1\r\nTransfer-Encoding: chunked, gzip",
+        "1.1\r\nTransfer-Encoding: gzip, chunked\r\n\r\n0",
+        "1.1\r\nTransfer-Encoding: gzip\r\nContent-Length: 0",
+        "1.1\r\nTransfer-Encoding: gzip\r\nTransfer-Encoding: chunked\r\n\r\n0",
+        "1.1\r\nTransfer-Encoding: chunked\r\nContent-Length: 0",
+        "1.0\r\nConnection: keep-alive\r\nTransfer-Encoding: chunked\r\n\r\n0"}) {
+    const std::string answer = SendText(std::string("POST / HTTP/") + header + next);
+    EXPECT_THAT(answer, HasSubstr(" 400 Bad Request\r\n")) << header;
+    EXPECT_EQ(answer.find(" 401 "), std::string::npos) << header;
+  }
+}
+
 TEST_F(GuardedServerThreadTest, EndsSlowConnections) {
   Server("refuse", {"300"});
   RawConnection silent(server_->Port());
