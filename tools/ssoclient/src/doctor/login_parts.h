@@ -3,6 +3,7 @@
 
 #include <memory>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <ssoclient/negotiation_handler.h>
@@ -55,8 +56,9 @@ struct ClaimedSigner {
   std::string fingerprint{};
 };
 
-/// The signers that the token names in its signature. The text need not be trusted.
-std::vector<ClaimedSigner> ReadClaimedSigners(const std::string& text);
+/// The signers that the token names in its signature. The text need not be trusted. Names that
+/// contain `secret`, if it is not empty, are left out.
+std::vector<ClaimedSigner> ReadClaimedSigners(const std::string& text, std::string_view secret);
 
 }  // namespace SsoClient::Tool::Doctor
 

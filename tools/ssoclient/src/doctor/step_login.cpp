@@ -65,6 +65,7 @@ class Login {
   }
 
   bool HasKerberosFailed() const { return handler_ && handler_->HasFailed(); }
+  const std::string& Password() const { return password_.Text(); }
   const std::string& TokenText() const { return factory_->Text(); }
 
  private:
@@ -85,9 +86,9 @@ class Login {
 
   std::shared_ptr<const SamlToken> ByPassword() {
     const auto begin = TimeLimit::Clock::now();
-    const SecretText password = examination_.plan.readPassword();
+    password_ = examination_.plan.readPassword();
     examination_.limit.Extend(TimeLimit::Clock::now() - begin);
-    return Service()->AcquireToken(examination_.plan.user, password.Text(), MakeSpec());
+    return Service()->AcquireToken(examination_.plan.user, password_.Text(), MakeSpec());
   }
 
   std::shared_ptr<const SamlToken> ByKerberos() {
@@ -108,6 +109,7 @@ class Login {
   Examination& examination_;
   std::shared_ptr<KeepingFactory> factory_;
   std::shared_ptr<NotingHandler> handler_;
+  SecretText password_;
 };
 
 Finding JudgeSuccess(const Examination& examination, const std::vector<ClaimedSigner>& signers) {
@@ -131,13 +133,17 @@ Step ExamineLogin(Examination& examination) {
     return step;
   }
   Login login(examination);
+  std::vector<ClaimedSigner> signers;
   try {
     examination.token = login.Run();
+    signers = ReadClaimedSigners(login.TokenText(), login.Password());
   } catch (const std::exception& failure) {
-    step.finding = JudgeLoginFailure(failure, ReadClaimedSigners(login.TokenText()),
-                                     SubjectsOf(examination), login.HasKerberosFailed());
+    signers = ReadClaimedSigners(login.TokenText(), login.Password());
+    step.finding = JudgeLoginFailure(failure, {.signers = signers,
+                                               .trusted = SubjectsOf(examination),
+                                               .secret = login.Password(),
+                                               .isKerberos = login.HasKerberosFailed()});
   }
-  const std::vector<ClaimedSigner> signers = ReadClaimedSigners(login.TokenText());
   for (const ClaimedSigner& signer : signers) {
     step.details["claimedSigners"].push_back(
         {{"subject", signer.subject}, {"fingerprint", signer.fingerprint}});

@@ -109,6 +109,33 @@ TEST_F(DoctorLoginTest, OtherFaultsAndTokensAreFound) {
   ExpectFailure(RunAlice(), "login", "token-rejected", 3, "token");
 }
 
+TEST_F(DoctorLoginTest, ThePasswordIsNeverInAReport) {
+  const std::string password = "s<cret & word";
+  ToolOptions forPeople;
+  forPeople.arguments = {"doctor",  "--url",  sts.HttpsUrl(),      "--ca",
+                         ca.Path(), "--user", "alice@EXAMPLE.COM", "--password-fd",
+                         "5"};
+  forPeople.descriptors = {{5, password + "\n"}};
+  for (const std::string text : {"no: s<cret & word", "no: s&amp;lt;cret &amp;amp; word"}) {
+    Misbehavior fault;
+    fault.fault = DevSts::FaultAnswer{"http://docs.oasis-open.org/ws-sx/ws-trust/200512",
+                                      "FailedAuthentication", text, false, 500};
+    sts.MisbehaveNext({});
+    sts.MisbehaveNext(fault);
+    const DoctorRun run = RunAlice(password);
+    ExpectFailure(run, "login", "login-refused", 1, "token");
+    EXPECT_THAT(run.Text(), Not(HasSubstr("cret")));
+    EXPECT_THAT(run.Message("login"), HasSubstr("not shown"));
+
+    sts.MisbehaveNext({});
+    sts.MisbehaveNext(fault);
+    const ToolResult result = RunTool(forPeople);
+    EXPECT_EQ(result.status, 1) << result.out;
+    EXPECT_THAT(result.out + result.err, Not(HasSubstr("cret")));
+    EXPECT_THAT(result.out, HasSubstr("first cause: the service's text is not shown"));
+  }
+}
+
 TEST_F(DoctorLoginTest, ATokenThatBeginsLaterIsAWarning) {
   DevSts::AssertionOptions late;
   late.notBeforeOffset = std::chrono::seconds(-200);
