@@ -1,4 +1,3 @@
-#include <ostream>
 #include <string>
 
 #include <CLI/CLI.hpp>
@@ -130,16 +129,7 @@ Doctor::Plan DoctorCommand::MakePlan() const {
 }
 
 Outcome DoctorCommand::Run(const Console& console) {
-  const bool showsProgress = console.errIsTerminal && !WantsJson();
-  const char* const eraseLine = "\r\x1b[K";  // ECMA-48, section 8.3.41
-  const Doctor::Report report = Doctor::Examine(MakePlan(), [&](const std::string& step) {
-    if (showsProgress) {
-      console.err << eraseLine << "examining: " << step << std::flush;
-    }
-  });
-  if (showsProgress) {
-    console.err << eraseLine << std::flush;
-  }
+  const Doctor::Report report = Doctor::Examine(MakePlan(), console);
   const ExitStatus status = StatusOf(report, isStrict_);
   if (WantsJson()) {
     return {status, std::make_shared<nlohmann::json>(ToJson(report))};

@@ -38,8 +38,10 @@ Finding OtherSigner(const LoginFacts& facts) {
 Finding JudgeLoginFailure(const std::exception& failure, const LoginFacts& facts) {
   const std::string message = TextWithout(facts.secret, failure.what());
   if (facts.isKerberos) {
-    return Failure(ExitStatus::kLocal, "kerberos-failed", "no Kerberos login: " + message,
-                   "get tickets with kinit, or give --keytab; check the name of --service");
+    return Failure(
+        ExitStatus::kLocal, "kerberos-failed", "no Kerberos login: " + message,
+        "get tickets with kinit, or give --keytab; check the name of --service, and whether "
+        "the KDC answers");
   }
   if (dynamic_cast<const PasswordExpiredException*>(&failure) != nullptr) {
     return Failure(ExitStatus::kRefused, "password-expired", message,

@@ -8,8 +8,10 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include "devsts/kerberos_realm.h"
 #include "devsts/server.h"
 #include "support/doctor_run.h"
+#include "support/peer.h"
 #include "support/temporary_file.h"
 
 namespace SsoClient::Tool::Testing {
@@ -17,6 +19,7 @@ namespace {
 
 using DevSts::Misbehavior;
 using Tarnik::Testing::TemporaryFile;
+using testing::EndsWith;
 using testing::HasSubstr;
 using testing::Not;
 
@@ -182,6 +185,41 @@ TEST_F(DoctorLoginTest, KerberosWithoutTicketsIsFound) {
   const DoctorRun run = Run({"--kerberos"});
   ExpectFailure(run, "login", "kerberos-failed", 4, "token");
   EXPECT_THAT(run.Remedy("login"), HasSubstr("kinit"));
+}
+
+TEST_F(DoctorLoginTest, TheProgressIsRemovedBeforeThePasswordIsAskedFor) {
+  ToolOptions options;
+  options.arguments = {"doctor",  "--url",  sts.HttpsUrl(),     "--ca",
+                       ca.Path(), "--user", "alice@EXAMPLE.COM"};
+  options.environment = {{"TERM", "dumb"}};
+  options.hasTerminal = true;
+  options.err = Stream::kTerminal;
+  ToolProcess tool(options);
+  ASSERT_TRUE(tool.WaitFor("alice@EXAMPLE.COM: "));
+  tool.Type("secret\n");
+  const ToolResult result = tool.Finish();
+  EXPECT_EQ(result.status, 0) << result.out;
+  const std::string before = result.terminal.substr(0, result.terminal.find("Password"));
+  EXPECT_THAT(before, HasSubstr("examining: sts"));
+  EXPECT_THAT(before, EndsWith(" \r"));
+  EXPECT_THAT(result.terminal, Not(HasSubstr("\x1b")));
+}
+
+TEST_F(DoctorLoginTest, KerberosThatIsNotAnsweredEndsInTime) {
+  DevSts::KerberosRealm realm;
+  const std::string keytab = realm.AddKeytab("machine");
+  const Peer silent(Silent());
+  const std::string authority = silent.Url().substr(8, silent.Url().rfind('/') - 8);
+  const TemporaryFile config(
+      "[libdefaults]\ndefault_realm = EXAMPLE.COM\ndns_lookup_kdc = false\n"
+      "udp_preference_limit = 1\n[realms]\nEXAMPLE.COM = {\nkdc = " +
+      authority + "\n}\n");
+  environment = {{"KRB5_CONFIG", config.Path()}};
+  const DoctorRun run = Run({"--kerberos", "--service", "HTTP@sts.example", "--principal",
+                             "machine", "--keytab", keytab, "--timeout", "3"});
+  ExpectFailure(run, "login", "kerberos-failed", 4, "token");
+  EXPECT_THAT(run.Message("login"), HasSubstr("The time is over"));
+  EXPECT_LT(run.DurationMs("login"), 5000);
 }
 
 }  // namespace
