@@ -8,6 +8,7 @@
 #include "doctor/runner.h"
 #include "input/secret.h"
 #include "options/connection_options.h"
+#include "options/service_options.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -33,6 +34,7 @@ class DoctorCommand final : public Command {
   std::string principal_;
   std::string keytab_;
   bool isKerberos_ = false;
+  bool isHttpAllowed_ = false;
   bool isStrict_ = false;
 };
 
@@ -45,6 +47,7 @@ CLI::App* DoctorCommand::AddTo(CLI::App& program) {
       "password and no token, and cannot be counted as a failed login. With one it logs in once.");
   SetExample(*command, "ssoclient doctor --url https://sts.example.com/sts --ca ca.pem");
   connection_.AddTo(*command);
+  AddHttpOption(*command, isHttpAllowed_);
   command
       ->add_option("--sts-certificate", stsCertificate_,
                    "The certificates, PEM or DER, with which the service may sign tokens")
@@ -122,6 +125,7 @@ Doctor::Plan DoctorCommand::MakePlan() const {
   plan.principal = principal_;
   plan.keytab = keytab_;
   plan.login = Kind();
+  plan.isHttpAllowed = isHttpAllowed_;
   plan.makeSslContext = [this] { return connection_.MakeSslContext(); };
   plan.readPassword = [this] { return password_.Read("Password of " + user_ + ": ", false); };
   plan.readPassphrase = [this] { return passphrase_.Read("Passphrase of " + key_ + ": ", false); };

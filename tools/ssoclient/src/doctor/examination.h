@@ -40,6 +40,7 @@ struct Plan {
   std::string keytab{};
   std::chrono::milliseconds timeout{30000};
   LoginKind login = LoginKind::kNone;
+  bool isHttpAllowed = false;  ///< for a login
   /// The TLS trust of the options. Throws an exception when it cannot be made.
   std::function<Tarnik::Ref<Tarnik::Ssl::SSLContext>()> makeSslContext{};
   /// The password, and the passphrase of the key. May ask the user; throw `ToolException`.

@@ -175,6 +175,13 @@ Step ExamineLogin(Examination& examination) {
     step.finding = NotNeeded("no login was asked for: --user, --certificate or --kerberos");
     return step;
   }
+  if (!examination.target.isHttps && !examination.plan.isHttpAllowed) {
+    step.finding =
+        Failure(ExitStatus::kUsage, "plain-http",
+                "over http, everybody on the way can read passwords and tokens: no login was sent",
+                "use an https URL, or accept this with --allow-http");
+    return step;
+  }
   Login login(examination);
   std::vector<ClaimedSigner> signers;
   try {

@@ -164,6 +164,24 @@ TEST_F(DoctorLoginTest, NoPasswordIsSentWhileTheClockIsFarOff) {
   EXPECT_EQ(sts.Requests().size(), 1U);
 }
 
+TEST_F(DoctorLoginTest, NoPasswordIsSentOverHttpUnlessThatIsAllowed) {
+  ToolOptions options;
+  options.arguments = {"doctor",        "--json", "--url",
+                       sts.HttpUrl(),   "--user", "alice@EXAMPLE.COM",
+                       "--password-fd", "5"};
+  options.descriptors = {{5, "secret\n"}};
+  const DoctorRun run(options);
+  ExpectFailure(run, "login", "plain-http", 2, "token");
+  EXPECT_THAT(run.Remedy("login"), HasSubstr("--allow-http"));
+  ASSERT_EQ(sts.Requests().size(), 1U);  // the harmless one
+  EXPECT_THAT(sts.Requests()[0].body, Not(HasSubstr("secret")));
+
+  options.arguments.push_back("--allow-http");
+  const DoctorRun allowed(options);
+  EXPECT_EQ(allowed.Status(), 0) << allowed.Text();
+  EXPECT_EQ(allowed.Finding("login"), "signature-not-verified");
+}
+
 TEST_F(DoctorLoginTest, AMissingPasswordIsFound) {
   ExpectFailure(Run({"--user", "alice@EXAMPLE.COM"}), "login", "no-password", 2, "token");
 }
