@@ -1,4 +1,3 @@
-#include <ostream>
 #include <string>
 #include <vector>
 
@@ -33,6 +32,7 @@ class DoctorCommand final : public Command {
   KerberosOptions kerberos_;
   std::vector<std::string> signerFiles_;
   std::string user_;
+  bool isHttpAllowed_ = false;
   bool isStrict_ = false;
 };
 
@@ -45,6 +45,7 @@ CLI::App* DoctorCommand::AddTo(CLI::App& program) {
       "password and no token, and cannot be counted as a failed login. With one it logs in once.");
   SetExample(*command, "ssoclient doctor --url https://sts.example.com/sts --ca ca.pem");
   connection_.AddTo(*command);
+  AddHttpOption(*command, isHttpAllowed_);
   AddSignersOption(*command, signerFiles_);
   AddLoginOptions(*command);
   command->add_flag("--strict", isStrict_, "Treat warnings as failures in the exit status");
@@ -89,6 +90,7 @@ Doctor::Plan DoctorCommand::MakePlan() const {
   plan.credentialCache = kerberos_.CredentialCache();
   plan.keytab = kerberos_.Keytab();
   plan.login = Kind();
+  plan.isHttpAllowed = isHttpAllowed_;
   plan.makeSslContext = [this] { return connection_.MakeSslContext(); };
   plan.readPassword = [this] { return password_.Read("Password for " + user_ + ": ", false); };
   plan.loadIdentity = [this](bool mayBeOpen) { return key_.Load(mayBeOpen); };
@@ -96,16 +98,7 @@ Doctor::Plan DoctorCommand::MakePlan() const {
 }
 
 Outcome DoctorCommand::Run(const Console& console) {
-  const bool showsProgress = console.errIsTerminal && !WantsJson();
-  const char* const eraseLine = "\r\x1b[K";  // ECMA-48, section 8.3.41
-  const Doctor::Report report = Doctor::Examine(MakePlan(), [&](const std::string& step) {
-    if (showsProgress) {
-      console.err << eraseLine << "examining: " << step << std::flush;
-    }
-  });
-  if (showsProgress) {
-    console.err << eraseLine << std::flush;
-  }
+  const Doctor::Report report = Doctor::Examine(MakePlan(), console);
   const ExitStatus status = StatusOf(report, isStrict_);
   if (WantsJson()) {
     return {status, std::make_shared<nlohmann::json>(ToJson(report))};

@@ -19,6 +19,7 @@
 #include "doctor/time_limit.h"
 #include "doctor/tls_probe.h"
 #include "input/secret_text.h"
+#include "output/console.h"
 
 namespace SsoClient::Tool::Doctor {
 
@@ -41,6 +42,7 @@ struct Plan {
   std::string keytab{};
   std::chrono::milliseconds timeout{30000};
   LoginKind login = LoginKind::kNone;
+  bool isHttpAllowed = false;  ///< for a login
   /// The TLS trust of the options. Throws an exception when it cannot be made.
   std::function<Tarnik::Ref<Tarnik::Ssl::SSLContext>()> makeSslContext{};
   /// The password. May ask the user; throws `ToolException`.
@@ -74,9 +76,11 @@ struct HttpAnswer {
 
 /// What the steps have found out for those after them.
 struct Examination {
-  explicit Examination(const Plan& thePlan) : plan(thePlan), limit(thePlan.timeout) {}
+  Examination(const Plan& thePlan, const Console& theConsole)
+      : plan(thePlan), console(theConsole), limit(thePlan.timeout) {}
 
   const Plan& plan;
+  const Console& console;
   TimeLimit limit;
   Target target{};
   Tarnik::Ref<Tarnik::Ssl::SSLContext> sslContext{};

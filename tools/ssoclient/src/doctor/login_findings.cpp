@@ -5,9 +5,17 @@
 #include <tarnik/crypto/crypto_exception.h>
 
 #include "failure.h"
+#include "service/secret_search.h"
 
 namespace SsoClient::Tool::Doctor {
 namespace {
+
+// A service may repeat what it was sent.
+std::string TextWithout(std::string_view secret, const std::string& text) {
+  return ContainsSecret(text, secret)
+             ? "the service's text is not shown, since it contains the password"
+             : text;
+}
 
 std::string Names(const std::vector<ClaimedSigner>& signers) {
   std::string names;
@@ -17,22 +25,23 @@ std::string Names(const std::vector<ClaimedSigner>& signers) {
   return names.empty() ? "a key that it does not name by a certificate" : names;
 }
 
-Finding OtherSigner(const std::vector<ClaimedSigner>& signers, const std::string& trusted) {
+Finding OtherSigner(const LoginFacts& facts) {
   return Failure(ExitStatus::kUnreachable, "signer-mismatch",
-                 "the token was not accepted: it is signed with " + Names(signers) +
-                     ", and --sts-certificate has " + trusted,
+                 "the token was not accepted: it is signed with " + Names(facts.signers) +
+                     ", and --sts-certificate has " + facts.trusted,
                  "get the current signing certificate of the service from a trusted source, and "
                  "give it as --sts-certificate");
 }
 
 }  // namespace
 
-Finding JudgeLoginFailure(const std::exception& failure, const std::vector<ClaimedSigner>& signers,
-                          const std::string& trusted, bool isKerberos) {
-  const std::string message = failure.what();
-  if (isKerberos) {
-    return Failure(ExitStatus::kLocal, "kerberos-failed", "no Kerberos login: " + message,
-                   "get tickets with kinit, or give --keytab; check the name of --service");
+Finding JudgeLoginFailure(const std::exception& failure, const LoginFacts& facts) {
+  const std::string message = TextWithout(facts.secret, failure.what());
+  if (facts.isKerberos) {
+    return Failure(
+        ExitStatus::kLocal, "kerberos-failed", "no Kerberos login: " + message,
+        "get tickets with kinit, or give --keytab; check the name of --service, and whether "
+        "the KDC answers");
   }
   if (dynamic_cast<const PasswordExpiredException*>(&failure) != nullptr) {
     return Failure(ExitStatus::kRefused, "password-expired", message,
@@ -44,7 +53,7 @@ Finding JudgeLoginFailure(const std::exception& failure, const std::vector<Claim
                    "is locked");
   }
   if (dynamic_cast<const InvalidSignatureException*>(&failure) != nullptr) {
-    return OtherSigner(signers, trusted);
+    return OtherSigner(facts);
   }
   if (dynamic_cast<const InvalidTokenException*>(&failure) != nullptr) {
     return Failure(ExitStatus::kUnreachable, "token-rejected",
@@ -64,7 +73,7 @@ Finding JudgeLoginFailure(const std::exception& failure, const std::vector<Claim
   const Tool::Failure other = FailureOf(failure);
   const bool isOwn = dynamic_cast<const ToolException*>(&failure) != nullptr;
   return Failure(
-      other.status, isOwn ? other.kind : "login-failed", other.message,
+      other.status, isOwn ? other.kind : "login-failed", message,
       other.remedy.empty() ? "check the user name and the files of the login" : other.remedy);
 }
 

@@ -3,6 +3,7 @@
 
 #include <exception>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "doctor/login_parts.h"
@@ -10,11 +11,17 @@
 
 namespace SsoClient::Tool::Doctor {
 
-/// What a failed login means. `signers` are those that the refused token names, `trusted` the
-/// subjects of --sts-certificate; `isKerberos` says that the client's side of the negotiation
-/// failed.
-Finding JudgeLoginFailure(const std::exception& failure, const std::vector<ClaimedSigner>& signers,
-                          const std::string& trusted, bool isKerberos);
+/// What a login has shown besides its failure.
+struct LoginFacts {
+  /// Those that the refused token names.
+  std::vector<ClaimedSigner> signers{};
+  std::string trusted{};      ///< the subjects of --sts-certificate
+  std::string_view secret{};  ///< the password, which must not be in a finding; empty for none
+  bool isKerberos = false;    ///< the client's side of the negotiation failed
+};
+
+/// What a failed login means.
+Finding JudgeLoginFailure(const std::exception& failure, const LoginFacts& facts);
 
 }  // namespace SsoClient::Tool::Doctor
 

@@ -8,6 +8,8 @@
 #include <tarnik/text/string_util.h>
 #include <tarnik/xml/security/signature.h>
 
+#include "service/secret_search.h"
+
 namespace SsoClient::Tool::Doctor {
 namespace {
 
@@ -56,13 +58,16 @@ std::shared_ptr<const std::vector<unsigned char>> NotingHandler::Negotiate(
   return leg;
 }
 
-std::vector<ClaimedSigner> ReadClaimedSigners(const std::string& text) {
+std::vector<ClaimedSigner> ReadClaimedSigners(const std::string& text, std::string_view secret) {
   std::vector<ClaimedSigner> signers;
   try {
     const auto token = CreateSamlToken(text, kAnyTime);
     for (const auto& der : token->GetSignature()->KeyInfo().certificates) {
       const auto certificate = Tarnik::Crypto::CreateCertificateFromDer(der.data(), der.size());
-      signers.push_back({Tarnik::ToDisplayText(certificate->SubjectName(), kShownSigner),
+      const std::string subject = certificate->SubjectName();
+      signers.push_back({ContainsSecret(subject, secret)
+                             ? "a name that contains the password"
+                             : Tarnik::ToDisplayText(subject, kShownSigner),
                          Tarnik::Crypto::FingerprintText(*certificate)});
     }
   } catch (const Tarnik::Exception&) {

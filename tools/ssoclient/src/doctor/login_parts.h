@@ -1,8 +1,10 @@
 #ifndef SSOCLIENT_TOOL_DOCTOR_LOGIN_PARTS_H
 #define SSOCLIENT_TOOL_DOCTOR_LOGIN_PARTS_H
 
+#include <atomic>
 #include <memory>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <ssoclient/negotiation_handler.h>
@@ -26,7 +28,7 @@ class KeepingFactory final : public SamlTokenFactory {
   std::shared_ptr<const SamlToken> CreateToken(Tarnik::Xml::ElementNode* assertion,
                                                long clockToleranceSec) const override;
 
-  /// The text; secret. Empty if no token has arrived.
+  /// The text; secret. Empty if no token has arrived. Not while an operation uses the factory.
   const std::string& Text() const noexcept { return text_; }
 
  private:
@@ -34,7 +36,8 @@ class KeepingFactory final : public SamlTokenFactory {
   mutable std::string text_;  // one operation at a time uses this factory
 };
 
-/// A handler that notes whether an exception came from it, and not from the service.
+/// A handler that notes whether an exception came from it, and not from the service. Another thread
+/// may ask for that.
 class NotingHandler final : public NegotiationHandler {
  public:
   explicit NotingHandler(std::shared_ptr<NegotiationHandler> inner);
@@ -42,11 +45,12 @@ class NotingHandler final : public NegotiationHandler {
   std::shared_ptr<const std::vector<unsigned char>> Negotiate(
       const std::vector<unsigned char>& serverLeg) override;
 
+  /// True also while it is at work.
   bool HasFailed() const noexcept { return hasFailed_; }
 
  private:
   std::shared_ptr<NegotiationHandler> inner_;
-  bool hasFailed_ = false;
+  std::atomic<bool> hasFailed_ = false;
 };
 
 /// A certificate that a token says it is signed with.
@@ -55,8 +59,9 @@ struct ClaimedSigner {
   std::string fingerprint{};
 };
 
-/// The signers that the token names in its signature. The text need not be trusted.
-std::vector<ClaimedSigner> ReadClaimedSigners(const std::string& text);
+/// The signers that the token names in its signature. The text need not be trusted. Names that
+/// contain `secret`, if it is not empty, are left out.
+std::vector<ClaimedSigner> ReadClaimedSigners(const std::string& text, std::string_view secret);
 
 }  // namespace SsoClient::Tool::Doctor
 

@@ -1,19 +1,15 @@
 #ifndef SSOCLIENT_TOOL_DOCTOR_RUNNER_H
 #define SSOCLIENT_TOOL_DOCTOR_RUNNER_H
 
-#include <functional>
-#include <string>
-
 #include "doctor/examination.h"
 #include "doctor/report.h"
+#include "output/console.h"
 
 namespace SsoClient::Tool::Doctor {
 
-/// Is told each step before it begins.
-using Progress = std::function<void(const std::string& step)>;
-
-/// Runs all steps. A step that depends on one that failed is skipped.
-Report Examine(const Plan& plan, const Progress& progress);
+/// Runs all steps, and shows on the terminal of `console` which one is under way. A step that
+/// depends on one that failed is skipped.
+Report Examine(const Plan& plan, const Console& console);
 
 }  // namespace SsoClient::Tool::Doctor
 

@@ -1,19 +1,21 @@
 #include <chrono>
 #include <exception>
+#include <functional>
+#include <memory>
+#include <string>
 #include <utility>
+#include <vector>
 
 #include <ssoclient/security_token_service.h>
-#include <tarnik/http/bounded_user_agent.h>
-#include <tarnik/http/cookie_store.h>
 
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
 #include <ssoclient/gssapi_negotiation_handler.h>
 #endif
 
-#include "doctor/library_connection.h"
 #include "doctor/login_findings.h"
 #include "doctor/login_parts.h"
 #include "doctor/steps.h"
+#include "service/service_call.h"
 
 namespace SsoClient::Tool::Doctor {
 namespace {
@@ -45,52 +47,92 @@ std::string SubjectsOf(const Examination& examination) {
   return subjects;
 }
 
-// One login of the kind that was asked for.
+using Token = std::shared_ptr<const SamlToken>;
+using Operation = std::function<Token(const SecurityTokenService&)>;
+
+// How an operation has ended. The exception has its own class, unlike that of RunCall.
+struct Ending {
+  Token token{};
+  std::exception_ptr failure{};
+};
+
+// One login of the kind that was asked for. What it uses is shared with the thread of the call,
+// which may be abandoned.
 class Login {
  public:
   explicit Login(Examination& examination)
       : examination_(examination),
-        factory_(std::make_shared<KeepingFactory>(MakeFactory(examination))) {}
+        factory_(std::make_shared<KeepingFactory>(MakeFactory(examination))),
+        password_(std::make_shared<SecretText>()) {}
 
-  std::shared_ptr<const SamlToken> Run() {
-    const Plan& plan = examination_.plan;
-    switch (plan.login) {
+  Token Run() {
+    const Operation operation = MakeOperation();
+    const Ending ending = RunCall<Ending>(examination_.console, MakeSetup(),
+                                          [operation](const SecurityTokenService& service) {
+                                            Ending result;
+                                            try {
+                                              result.token = operation(service);
+                                            } catch (...) {
+                                              result.failure = std::current_exception();
+                                            }
+                                            return result;
+                                          });
+    if (ending.failure) {
+      std::rethrow_exception(ending.failure);
+    }
+    return ending.token;
+  }
+
+  bool HasKerberosFailed() const { return handler_ && handler_->HasFailed(); }
+  const std::string& Password() const { return password_->Text(); }
+  std::vector<ClaimedSigner> Signers() const {
+    // The text may still change in an abandoned call.
+    return IsCallAbandoned() ? std::vector<ClaimedSigner>()
+                             : ReadClaimedSigners(factory_->Text(), Password());
+  }
+
+ private:
+  ServiceSetup MakeSetup() const {
+    const Target& target = examination_.target;
+    ServiceSetup setup;
+    setup.address = {
+        .host = target.host, .target = target.path, .port = target.port, .isHttps = target.isHttps};
+    setup.peerName = examination_.plan.peerName;
+    setup.sslContext = examination_.sslContext;
+    setup.tokenFactory = factory_;
+    if (examination_.identity) {
+      setup.holderOfKey = *examination_.identity;
+    }
+    setup.secret = Password();
+    const auto time = examination_.limit.ForStep() - TimeLimit::Clock::now();
+    setup.timeoutSec = std::chrono::duration<double>(time).count();
+    return setup;
+  }
+
+  Operation MakeOperation() {
+    switch (examination_.plan.login) {
       case LoginKind::kPassword:
         return ByPassword();
       case LoginKind::kCertificate:
-        return Service()->AcquireTokenByCertificate(MakeSpec());
+        return [](const SecurityTokenService& service) {
+          return service.AcquireTokenByCertificate(MakeSpec());
+        };
       default:
         return ByKerberos();
     }
   }
 
-  bool HasKerberosFailed() const { return handler_ && handler_->HasFailed(); }
-  const std::string& TokenText() const { return factory_->Text(); }
-
- private:
-  std::shared_ptr<SecurityTokenService> Service() {
-    const auto spec = MakeConnectionSpec(examination_);
-    const auto cookies = Tarnik::Http::CreateCookieStore("doctor");
-    const auto agent = Tarnik::Http::CreateHttpUserAgent(spec.get(), cookies.get(), nullptr);
-    const auto limit = Tarnik::Http::CreateCallLimit(examination_.limit.ForStep());
-    SecurityTokenServiceConfigEx config;
-    config.url = examination_.target.path;
-    config.userAgent = Tarnik::Http::CreateBoundedUserAgent(agent.get(), limit.get());
-    config.tokenFactory = factory_;
-    if (examination_.identity) {
-      config.holderOfKeyConfig = *examination_.identity;
-    }
-    return CreateSecurityTokenService(config);
-  }
-
-  std::shared_ptr<const SamlToken> ByPassword() {
+  Operation ByPassword() {
     const auto begin = TimeLimit::Clock::now();
-    const SecretText password = examination_.plan.readPassword();
+    *password_ = examination_.plan.readPassword();
     examination_.limit.Extend(TimeLimit::Clock::now() - begin);
-    return Service()->AcquireToken(examination_.plan.user, password.Text(), MakeSpec());
+    return
+        [user = examination_.plan.user, password = password_](const SecurityTokenService& service) {
+          return service.AcquireToken(user, password->Text(), MakeSpec());
+        };
   }
 
-  std::shared_ptr<const SamlToken> ByKerberos() {
+  Operation ByKerberos() {
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
     const Plan& plan = examination_.plan;
     GssapiNegotiationConfig kerberos;
@@ -100,7 +142,9 @@ class Login {
     kerberos.keytab = plan.keytab;
     kerberos.credentialCache = plan.credentialCache;
     handler_ = std::make_shared<NotingHandler>(CreateGssapiNegotiationHandler(kerberos));
-    return Service()->AcquireTokenByGSS(MakeSpec(), *handler_);
+    return [handler = handler_](const SecurityTokenService& service) {
+      return service.AcquireTokenByGSS(MakeSpec(), *handler);
+    };
 #else
     throw SsoException("this build of the program has no Kerberos");
 #endif
@@ -109,6 +153,7 @@ class Login {
   Examination& examination_;
   std::shared_ptr<KeepingFactory> factory_;
   std::shared_ptr<NotingHandler> handler_;
+  std::shared_ptr<SecretText> password_;
 };
 
 Finding JudgeSuccess(const Examination& examination, const std::vector<ClaimedSigner>& signers) {
@@ -131,14 +176,25 @@ Step ExamineLogin(Examination& examination) {
     step.finding = NotNeeded("no login was asked for: --user, --certificate or --kerberos");
     return step;
   }
+  if (!examination.target.isHttps && !examination.plan.isHttpAllowed) {
+    step.finding =
+        Failure(ExitStatus::kUsage, "plain-http",
+                "over http, everybody on the way can read passwords and tokens: no login was sent",
+                "use an https URL, or accept this with --allow-http");
+    return step;
+  }
   Login login(examination);
+  std::vector<ClaimedSigner> signers;
   try {
     examination.token = login.Run();
+    signers = login.Signers();
   } catch (const std::exception& failure) {
-    step.finding = JudgeLoginFailure(failure, ReadClaimedSigners(login.TokenText()),
-                                     SubjectsOf(examination), login.HasKerberosFailed());
+    signers = login.Signers();
+    step.finding = JudgeLoginFailure(failure, {.signers = signers,
+                                               .trusted = SubjectsOf(examination),
+                                               .secret = login.Password(),
+                                               .isKerberos = login.HasKerberosFailed()});
   }
-  const std::vector<ClaimedSigner> signers = ReadClaimedSigners(login.TokenText());
   for (const ClaimedSigner& signer : signers) {
     step.details["claimedSigners"].push_back(
         {{"subject", signer.subject}, {"fingerprint", signer.fingerprint}});

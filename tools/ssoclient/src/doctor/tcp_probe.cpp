@@ -56,14 +56,20 @@ bool Await(std::vector<TcpAttempt>& attempts, Clock::time_point start, Clock::ti
   return wait > 0;
 }
 
+// False when the time is over, also while the socket is ready: it always is when the peer floods
+// it.
 bool WaitFor(int socket, short event, Clock::time_point end) {
-  for (;;) {
+  while (Clock::now() < end) {
     pollfd polled{socket, event, 0};
     const int ready = poll(&polled, 1, MillisecondsUntil(end));
-    if (ready >= 0 || errno != EINTR) {
-      return ready > 0;
+    if (ready > 0) {
+      return true;
+    }
+    if (ready < 0 && errno != EINTR) {
+      return false;
     }
   }
+  return false;
 }
 
 }  // namespace

@@ -16,6 +16,8 @@ namespace {
 using Clock = TimeLimit::Clock;
 
 constexpr std::size_t kFirstOctets = 64;
+// Several times what a handshake with long chains has.
+constexpr std::size_t kMaxOctets = std::size_t{256} * 1024;
 
 constexpr const char* kLibrarySuites =
     "ECDHE-ECDSA-AES256-GCM-SHA384:ECDHE-RSA-AES256-GCM-SHA384:"
@@ -99,7 +101,7 @@ class Handshake {
       ERR_clear_error();
       const int result = SSL_do_handshake(ssl_.get());
       const int reason = SSL_get_error(ssl_.get(), result);
-      const bool isSent = Flush(socket, end);
+      Flush(socket, end);
       if (result == 1) {
         Finish();
         return;
@@ -108,9 +110,6 @@ class Handshake {
         attempt_.error = ErrorText();
         return;
       }
-      if (!isSent) {
-        attempt_.isClosed = true;
-      }
       if (!Fill(socket, end)) {
         return;
       }
@@ -118,12 +117,13 @@ class Handshake {
   }
 
  private:
-  bool Flush(int socket, Clock::time_point end) {
+  // A peer that does not take it may have sent the reason, which is read in any case.
+  void Flush(int socket, Clock::time_point end) {
     char* octets = nullptr;
     const long size = BIO_get_mem_data(SSL_get_wbio(ssl_.get()), &octets);
     const std::string text(octets, static_cast<std::size_t>(std::max(size, 0L)));
     static_cast<void>(BIO_reset(SSL_get_wbio(ssl_.get())));
-    return WriteAll(socket, text, end);
+    WriteAll(socket, text, end);
   }
 
   bool Fill(int socket, Clock::time_point end) {
@@ -136,6 +136,11 @@ class Handshake {
     }
     attempt_.firstOctets += octets;
     attempt_.firstOctets.resize(std::min(attempt_.firstOctets.size(), kFirstOctets));
+    received_ += octets.size();
+    if (received_ > kMaxOctets) {
+      attempt_.error = "it sends more than a handshake has";
+      return false;
+    }
     const int size = static_cast<int>(octets.size());
     return BIO_write(SSL_get_rbio(ssl_.get()), octets.data(), size) == size;
   }
@@ -159,6 +164,7 @@ class Handshake {
 
   OwnedSsl ssl_;
   TlsAttempt& attempt_;
+  std::size_t received_ = 0;
 };
 
 }  // namespace

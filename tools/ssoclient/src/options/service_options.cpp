@@ -23,10 +23,7 @@ void AddSignersOption(CLI::App& command, std::vector<std::string>& files) {
 
 void ServiceOptions::AddConnectionTo(CLI::App& command) {
   connection_.AddTo(command);
-  command
-      .add_flag("--allow-http", isHttpAllowed_,
-                "Accept an http URL, over which everybody on the way can read passwords and tokens")
-      ->group("Connection");
+  AddHttpOption(command, isHttpAllowed_);
 }
 
 void ServiceOptions::AddSignersTo(CLI::App& command) {
@@ -68,6 +65,13 @@ ServiceSetup ServiceOptions::MakeSetup() const {
                          "use an https URL, or accept this with --allow-http"});
   }
   return setup;
+}
+
+void AddHttpOption(CLI::App& command, bool& isAllowed) {
+  command
+      .add_flag("--allow-http", isAllowed,
+                "Accept an http URL, over which everybody on the way can read passwords and tokens")
+      ->group("Connection");
 }
 
 }  // namespace SsoClient::Tool

@@ -40,6 +40,9 @@ class ServiceOptions {
   bool isHttpAllowed_ = false;
 };
 
+/// Adds --allow-http to the command.
+void AddHttpOption(CLI::App& command, bool& isAllowed);
+
 }  // namespace SsoClient::Tool
 
 #endif

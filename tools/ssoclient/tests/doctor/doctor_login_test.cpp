@@ -8,8 +8,10 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include "devsts/kerberos_realm.h"
 #include "devsts/server.h"
 #include "support/doctor_run.h"
+#include "support/peer.h"
 #include "support/temporary_file.h"
 
 namespace SsoClient::Tool::Testing {
@@ -17,6 +19,7 @@ namespace {
 
 using DevSts::Misbehavior;
 using Tarnik::Testing::TemporaryFile;
+using testing::EndsWith;
 using testing::HasSubstr;
 using testing::Not;
 
@@ -109,6 +112,33 @@ TEST_F(DoctorLoginTest, OtherFaultsAndTokensAreFound) {
   ExpectFailure(RunAlice(), "login", "token-rejected", 3, "token");
 }
 
+TEST_F(DoctorLoginTest, ThePasswordIsNeverInAReport) {
+  const std::string password = "s<cret & word";
+  ToolOptions forPeople;
+  forPeople.arguments = {"doctor",  "--url",  sts.HttpsUrl(),      "--ca",
+                         ca.Path(), "--user", "alice@EXAMPLE.COM", "--password-fd",
+                         "5"};
+  forPeople.descriptors = {{5, password + "\n"}};
+  for (const std::string text : {"no: s<cret & word", "no: s&amp;lt;cret &amp;amp; word"}) {
+    Misbehavior fault;
+    fault.fault = DevSts::FaultAnswer{"http://docs.oasis-open.org/ws-sx/ws-trust/200512",
+                                      "FailedAuthentication", text, false, 500};
+    sts.MisbehaveNext({});
+    sts.MisbehaveNext(fault);
+    const DoctorRun run = RunAlice(password);
+    ExpectFailure(run, "login", "login-refused", 1, "token");
+    EXPECT_THAT(run.Text(), Not(HasSubstr("cret")));
+    EXPECT_THAT(run.Message("login"), HasSubstr("not shown"));
+
+    sts.MisbehaveNext({});
+    sts.MisbehaveNext(fault);
+    const ToolResult result = RunTool(forPeople);
+    EXPECT_EQ(result.status, 1) << result.out;
+    EXPECT_THAT(result.out + result.err, Not(HasSubstr("cret")));
+    EXPECT_THAT(result.out, HasSubstr("first cause: the service's text is not shown"));
+  }
+}
+
 TEST_F(DoctorLoginTest, ATokenThatBeginsLaterIsAWarning) {
   DevSts::AssertionOptions late;
   late.notBeforeOffset = std::chrono::seconds(-200);
@@ -134,6 +164,24 @@ TEST_F(DoctorLoginTest, NoPasswordIsSentWhileTheClockIsFarOff) {
   EXPECT_EQ(sts.Requests().size(), 1U);
 }
 
+TEST_F(DoctorLoginTest, NoPasswordIsSentOverHttpUnlessThatIsAllowed) {
+  ToolOptions options;
+  options.arguments = {"doctor",        "--json", "--url",
+                       sts.HttpUrl(),   "--user", "alice@EXAMPLE.COM",
+                       "--password-fd", "5"};
+  options.descriptors = {{5, "secret\n"}};
+  const DoctorRun run(options);
+  ExpectFailure(run, "login", "plain-http", 2, "token");
+  EXPECT_THAT(run.Remedy("login"), HasSubstr("--allow-http"));
+  ASSERT_EQ(sts.Requests().size(), 1U);  // the harmless one
+  EXPECT_THAT(sts.Requests()[0].body, Not(HasSubstr("secret")));
+
+  options.arguments.push_back("--allow-http");
+  const DoctorRun allowed(options);
+  EXPECT_EQ(allowed.Status(), 0) << allowed.Text();
+  EXPECT_EQ(allowed.Finding("login"), "signature-not-verified");
+}
+
 TEST_F(DoctorLoginTest, AMissingPasswordIsFound) {
   ExpectFailure(Run({"--user", "alice@EXAMPLE.COM"}), "login", "no-password", 2, "token");
 }
@@ -155,6 +203,41 @@ TEST_F(DoctorLoginTest, KerberosWithoutTicketsIsFound) {
   const DoctorRun run = Run({"--kerberos"});
   ExpectFailure(run, "login", "kerberos-failed", 4, "token");
   EXPECT_THAT(run.Remedy("login"), HasSubstr("kinit"));
+}
+
+TEST_F(DoctorLoginTest, TheProgressIsRemovedBeforeThePasswordIsAskedFor) {
+  ToolOptions options;
+  options.arguments = {"doctor",  "--url",  sts.HttpsUrl(),     "--ca",
+                       ca.Path(), "--user", "alice@EXAMPLE.COM"};
+  options.environment = {{"TERM", "dumb"}};
+  options.hasTerminal = true;
+  options.err = Stream::kTerminal;
+  ToolProcess tool(options);
+  ASSERT_TRUE(tool.WaitFor("alice@EXAMPLE.COM: "));
+  tool.Type("secret\n");
+  const ToolResult result = tool.Finish();
+  EXPECT_EQ(result.status, 0) << result.out;
+  const std::string before = result.terminal.substr(0, result.terminal.find("Password"));
+  EXPECT_THAT(before, HasSubstr("examining: sts"));
+  EXPECT_THAT(before, EndsWith(" \r"));
+  EXPECT_THAT(result.terminal, Not(HasSubstr("\x1b")));
+}
+
+TEST_F(DoctorLoginTest, KerberosThatIsNotAnsweredEndsInTime) {
+  DevSts::KerberosRealm realm;
+  const std::string keytab = realm.AddKeytab("machine");
+  const Peer silent(Silent());
+  const std::string authority = silent.Url().substr(8, silent.Url().rfind('/') - 8);
+  const TemporaryFile config(
+      "[libdefaults]\ndefault_realm = EXAMPLE.COM\ndns_lookup_kdc = false\n"
+      "udp_preference_limit = 1\n[realms]\nEXAMPLE.COM = {\nkdc = " +
+      authority + "\n}\n");
+  environment = {{"KRB5_CONFIG", config.Path()}};
+  const DoctorRun run = Run({"--kerberos", "--service", "HTTP@sts.example", "--principal",
+                             "machine", "--keytab", keytab, "--timeout", "3"});
+  ExpectFailure(run, "login", "kerberos-failed", 4, "token");
+  EXPECT_THAT(run.Message("login"), HasSubstr("The time is over"));
+  EXPECT_LT(run.DurationMs("login"), 5000);
 }
 
 }  // namespace

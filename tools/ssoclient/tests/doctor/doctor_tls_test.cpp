@@ -3,6 +3,7 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/socket.h>
 
 #include "devsts/certificates.h"
 #include "devsts/server.h"
@@ -51,6 +52,22 @@ TEST(DoctorTlsTest, ASilentServiceTakesOnlyAThirdOfTheTime) {
 TEST(DoctorTlsTest, AServiceThatEndsConnectionsIsFound) {
   const Peer closing([](int) {});
   ExpectFailure(RunDoctor(closing.Url()), "tls", "tls-closed", 3, "certificate");
+}
+
+TEST(DoctorTlsTest, AServiceThatNeverStopsSendingIsFound) {
+  // A client ignores each HelloRequest (RFC 5246, section 7.4.1.1).
+  const std::string request("\x16\x03\x03\x00\x04\x00\x00\x00\x00", 9);
+  std::string requests;
+  for (int i = 0; i < 1000; ++i) {
+    requests += request;
+  }
+  const Peer flooding([requests](int descriptor) {
+    while (send(descriptor, requests.data(), requests.size(), MSG_NOSIGNAL) > 0) {
+    }
+  });
+  const DoctorRun run = RunDoctor(flooding.Url(), {"--timeout", "20"});
+  ExpectFailure(run, "tls", "tls-refused", 3, "certificate");
+  EXPECT_THAT(run.Message("tls"), HasSubstr("more than a handshake"));
 }
 
 TEST(DoctorTlsTest, VersionsBelowTls12AreFound) {
