@@ -18,12 +18,12 @@ class ServiceCallTest : public ServiceTest {
     DevSts::Misbehavior silent;
     silent.stall = DevSts::Stall::BeforeAnswer;
     Sts().SetMisbehavior(silent);
-    const auto before = Sts().GetCounters().stalled;
+    const auto before = Sts().GetCounters().stalls;
     ToolOptions options;
     options.arguments = arguments;
     ToolProcess tool(options);
     EXPECT_TRUE(
-        Sts().WaitUntil([before](const auto& counters) { return counters.stalled > before; }));
+        Sts().WaitUntil([before](const auto& counters) { return counters.stalls > before; }));
     tool.Signal(signal);
     return tool.Finish();
   }
