@@ -14,6 +14,13 @@
 #include "wire/tls_context.h"
 
 namespace DevSts {
+
+// What connections over TLS use.
+struct TlsIdentity {
+  ServerIdentity identity;
+  std::shared_ptr<SSL_CTX> context;
+};
+
 namespace {
 
 // Long enough that clients do not warn that a certificate expires soon.
@@ -48,12 +55,6 @@ Credential SignerOf(const ServerOptions& options) {
   return IsGiven(options.keys.signing) ? options.keys.signing
                                        : MakeSigner(options.assertion.signingKey, false);
 }
-
-// What connections over TLS use.
-struct TlsIdentity {
-  ServerIdentity identity;
-  std::shared_ptr<SSL_CTX> context;
-};
 
 TlsIdentity MakeTlsIdentity(const TlsOptions& options, const ServerKeys& keys,
                             const Credential& authority) {
