@@ -19,7 +19,7 @@ std::string Part(long count, const Unit& unit) {
   return std::to_string(count) + " " + unit.name;
 }
 
-// Zero for a name that is none.
+// Zero for an unknown name.
 long SecondsOf(std::string_view unit) {
   if (unit.empty()) {
     return 1;
