@@ -64,11 +64,15 @@ Finding Unanswered(const char* name, const std::string& message, const char* rem
   return Failure(ExitStatus::kUnreachable, name, message, remedy);
 }
 
+Finding CertificateRequired(const std::string& message) {
+  return Unanswered("client-certificate-required",
+                    "the service requires a TLS certificate of the client: " + message,
+                    "use a port of the service that requires none");
+}
+
 Finding JudgeTlsFailure(const Examination& examination, const std::string& message) {
   if (examination.tls.asksForCertificate) {
-    return Unanswered("client-certificate-required",
-                      "the service requires a TLS certificate of the client: " + message,
-                      "use a port of the service that requires none");
+    return CertificateRequired(message);
   }
   return Unanswered("tls-broken", "TLS failed during the exchange: " + message,
                     "look into the log of the service; try again");
@@ -103,6 +107,10 @@ Finding JudgeFailure(const Examination& examination, const Tarnik::Exception& fa
   }
   if (dynamic_cast<const Tarnik::Ssl::SSLException*>(&failure) != nullptr) {
     return JudgeTlsFailure(examination, message);
+  }
+  // TLS 1.3 refuses a client after the handshake, and the alert may be lost with the connection.
+  if (examination.tls.asksForCertificate) {
+    return CertificateRequired(message);
   }
   return Unanswered("http-failed", "the exchange failed: " + message,
                     "look into the log of the service; try again");
