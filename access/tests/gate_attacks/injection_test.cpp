@@ -94,7 +94,7 @@ TEST_F(InjectionTest, GroupsStayInTheirLine) {
 TEST_F(InjectionTest, FaultsOfTheTokenStayInTheirLine) {
   for (const std::string& forged : {kForged, kLong}) {
     AssertionText changed = text;
-    changed.attributes = With(changed.attributes, "2.0", forged);
+    changed.attributes = Replaced(changed.attributes, "\"2.0", "\"" + forged + "2.0");
     ExpectSafe(Reason::kBadLayout, changed);
     changed = text;
     changed.conditions = Replaced(changed.conditions, "rsa:RenewRestrictionType", "rsa:" + forged);
