@@ -16,7 +16,7 @@ struct RepeatInputs {
 };
 
 /// Returns the operation with this name, ready to be called any number of times, or an empty
-/// function if there is none. Each program that is linked with repeat.cpp defines it.
+/// function for an unknown name. Each program that is linked with repeat.cpp defines it.
 std::function<void()> PrepareOperation(const std::string& name, const RepeatInputs& inputs);
 
 }  // namespace Bench

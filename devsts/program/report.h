@@ -26,7 +26,7 @@ class LineOutput {
 std::string DescribeRequest(const ReceivedRequest& request);
 // The counters as NAME=VALUE.
 std::string DescribeCounters(const Counters& counters);
-// The counter with this name. Throws std::invalid_argument if there is none.
+// The counter with this name. Throws std::invalid_argument for an unknown name.
 std::uint64_t CounterNamed(const std::string& name, const Counters& counters);
 
 }  // namespace DevSts::Program

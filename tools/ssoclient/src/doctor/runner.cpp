@@ -40,7 +40,7 @@ const std::vector<Entry>& AllSteps() {
   return kSteps;
 }
 
-// The step that has to succeed and did not; null if there is none.
+// The step that has to succeed and did not; null if all succeeded.
 const Step* BlockerOf(const Entry& entry, const Report& report) {
   const auto blocks = [&](const Step& step) {
     const bool isNeeded =

@@ -18,7 +18,7 @@ const char* NameOf(Access::Remedy remedy) noexcept;
 /// Who can do something about a refusal, in a sentence for people; empty for `Remedy::kNone`.
 std::string RemedyText(Access::Remedy remedy);
 
-/// The option of 'ssoclient verify' to look at after this refusal; empty if there is none.
+/// The option of 'ssoclient verify' to look at after this refusal; empty if no option applies.
 std::string OptionHint(Access::Reason reason);
 
 /// The members of docs/tool.md: the decision, and a record of each check.
