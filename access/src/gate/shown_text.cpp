@@ -30,8 +30,7 @@ std::string ShownName(const PrincipalId& principal) {
 }
 
 std::string ShownCertificate(const Tarnik::Crypto::Certificate& certificate) {
-  return Tarnik::ToDisplayText(certificate.SubjectName(), kMaxShown) + " (SHA-256 " +
-         FingerprintOf(certificate) + ")";
+  return ShownText(certificate.SubjectName()) + " (SHA-256 " + FingerprintOf(certificate) + ")";
 }
 
 std::string ShownDuration(std::chrono::seconds duration) {

@@ -17,7 +17,7 @@ std::string ShownText(std::string_view text);
 /// "name@domain" in the same way.
 std::string ShownName(const PrincipalId& principal);
 
-/// "CN=holder (SHA-256 AB:CD:EF:01:23:45:67:89...)"
+/// "'CN=holder' (SHA-256 AB:CD:EF:01:23:45:67:89...)"
 std::string ShownCertificate(const Tarnik::Crypto::Certificate& certificate);
 
 /// "300 s"

@@ -1,5 +1,7 @@
 #include "gate/signer_rules.h"
 
+#include <algorithm>
+
 #include <tarnik/core/exception.h>
 
 namespace SsoClient::Access {
@@ -59,6 +61,10 @@ Reason KeepValid(Signers& signers, const ClockRules& clock) {
 
 Reason KeepUnrevoked(Signers& signers, const ClockRules& clock) {
   return KeepPassing(signers, clock, RevocationOf);
+}
+
+void KeepTried(Signers& signers) {
+  signers.resize(std::min(signers.size(), kMostTried));
 }
 
 }  // namespace SsoClient::Access

@@ -13,8 +13,8 @@ namespace SsoClient::Access {
 
 using Signers = std::vector<const Signer*>;
 
-/// The signers that may have signed the token, by its issuer and its KeyInfo, at most 16. Both
-/// are only what the token claims.
+/// The signers that may have signed the token, by its issuer and its KeyInfo. Both are only what
+/// the token claims.
 Signers SelectSigners(const TrustSnapshot& trust, const SamlToken& token);
 
 /// `Reason::kNone`, `kSignerNotYetValid` or `kSignerExpired`. RFC 5280, section 4.1.2.5: a
@@ -29,6 +29,9 @@ Reason RevocationOf(const Signer& signer, const ClockRules& clock) noexcept;
 /// when none is left.
 Reason KeepValid(Signers& signers, const ClockRules& clock);
 Reason KeepUnrevoked(Signers& signers, const ClockRules& clock);
+/// Removes those after the first `kMostTried`, so that a token cannot cost the time of verifying
+/// its signature with any number of keys.
+void KeepTried(Signers& signers);
 
 }  // namespace SsoClient::Access
 

@@ -67,6 +67,7 @@ CheckResult CheckSigner(CheckedToken& checked, const ClockRules& clock, std::str
   if (const Reason reason = KeepUnrevoked(signers, clock); reason != Reason::kNone) {
     return {CheckKind::kSignerRevoked, reason};
   }
+  KeepTried(signers);
   return {CheckKind::kSignature, CheckSignature(checked, signers, detail)};
 }
 

@@ -31,6 +31,7 @@ Signers SignersOf(const VerdictFacts& facts, CheckKind check) {
   }
   if (check > CheckKind::kSignerRevoked) {
     KeepUnrevoked(signers, ClockOf(facts));
+    KeepTried(signers);
   }
   return signers;
 }

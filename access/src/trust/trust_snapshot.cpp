@@ -1,23 +1,31 @@
 #include "trust/trust_snapshot.h"
 
-#include <algorithm>
+#include <set>
 #include <utility>
 
+#include <tarnik/core/ref.h>
 #include <tarnik/crypto/certificate.h>
 
 namespace SsoClient::Access {
 
 namespace {
 
-constexpr std::size_t kMostCandidates = 16;
+using Certificates = std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>>;
 
-const Signer* FindCertificate(const std::vector<Signer>& signers,
-                              const Tarnik::Crypto::Certificate& certificate) {
-  // The resolver returns the objects that it was given.
-  const auto found = std::find_if(
-      signers.begin(), signers.end(),
-      [&certificate](const Signer& signer) { return signer.certificate.get() == &certificate; });
-  return found == signers.end() ? nullptr : &*found;
+// The signers with the certificates, which are the objects that the resolver was given.
+std::vector<const Signer*> SignersWith(const Certificates& certificates,
+                                       const std::vector<Signer>& signers) {
+  std::set<const Tarnik::Crypto::Certificate*> wanted;
+  for (const auto& certificate : certificates) {
+    wanted.insert(certificate.get());
+  }
+  std::vector<const Signer*> found;
+  for (const Signer& signer : signers) {
+    if (wanted.count(signer.certificate.get()) != 0) {
+      found.push_back(&signer);
+    }
+  }
+  return found;
 }
 
 // By the URI of a signature method (RFC 6931, section 2.3).
@@ -30,24 +38,15 @@ bool HasKeyFor(std::string_view method, const Tarnik::Crypto::Certificate& certi
 
 std::vector<const Signer*> IssuerTrust::Select(const Tarnik::Xml::Security::KeyInfo& keyInfo,
                                                std::string_view method) const {
-  std::vector<const Signer*> selected;
   if (resolver == nullptr) {
-    return selected;
+    return {};
   }
   auto candidates = resolver->CandidateCertificates(keyInfo);
-  if (candidates.size() > kMostCandidates) {
+  if (candidates.size() > kMostTried) {
     std::erase_if(candidates,
                   [method](const auto& certificate) { return !HasKeyFor(method, *certificate); });
   }
-  for (const auto& certificate : candidates) {
-    if (selected.size() == kMostCandidates) {
-      break;
-    }
-    if (const Signer* const signer = FindCertificate(signers, *certificate)) {
-      selected.push_back(signer);
-    }
-  }
-  return selected;
+  return SignersWith(candidates, signers);
 }
 
 TrustSnapshot::TrustSnapshot(std::map<std::string, IssuerTrust, std::less<>> named,

@@ -1,6 +1,7 @@
 #ifndef SSOCLIENT_ACCESS_TRUST_TRUST_SNAPSHOT_H
 #define SSOCLIENT_ACCESS_TRUST_TRUST_SNAPSHOT_H
 
+#include <cstddef>
 #include <cstdint>
 #include <map>
 #include <optional>
@@ -33,14 +34,17 @@ struct Signer {
   bool isRevocationChecked = false;
 };
 
+/// How many keys are tried for a signature that does not say which key has made it.
+inline constexpr std::size_t kMostTried = 16;
+
 /// The signers of one issuer.
 struct IssuerTrust {
   std::vector<Signer> signers;
   /// Selects among the signers' certificates; null without signers.
   Tarnik::Ref<const Tarnik::Xml::Security::CertificateCandidatesResolver> resolver;
 
-  /// The signers that a signature by `method` with `keyInfo` may have been made by, at most 16. If
-  /// there are more, those whose keys are of another type do not count.
+  /// The signers that a signature by `method` with `keyInfo` may have been made by. If there are
+  /// more than `kMostTried`, those whose keys are of another type are left out.
   std::vector<const Signer*> Select(const Tarnik::Xml::Security::KeyInfo& keyInfo,
                                     std::string_view method) const;
 };

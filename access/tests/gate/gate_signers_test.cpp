@@ -82,6 +82,11 @@ TEST_F(GateSignersTest, OnlyUsableSignersAreTried) {
     ExpectRefused(Check(SignedWithoutKeyInfo(text, first)), Reason::kBadSignature,
                   CheckKind::kSignature);
   }
+  // They do not count among the sixteen.
+  std::vector<Signer> many(16, expired);
+  many.push_back(SignerOf(second));
+  trust->Set({{kTokenIssuer, many}});
+  ExpectAccepted(Check(SignedWithoutKeyInfo(text, second)));
   // The reason is that of the first one.
   Signer early = SignerOf(second);
   early.notBefore = After(start, std::chrono::hours(1));

@@ -85,7 +85,7 @@ TEST_F(GateTextsTest, NamesEachPart) {
   const auto compared = [&verdict](CheckKind check) { return RecordOf(verdict, check).compared; };
   const std::string signer = SignerOf(TrustedCredential()).name;
   const std::string holder =
-      "CN=holder (SHA-256 " +
+      "'CN=holder' (SHA-256 " +
       Tarnik::Crypto::FingerprintText(*CertificateOf(HolderCredential())).substr(0, 23) + "...)";
   EXPECT_EQ(compared(CheckKind::kLayout),
             "assertion '_a1' of 'https://sts.example.com/STS' about 'alice@example.com'");
