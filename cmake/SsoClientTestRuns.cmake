@@ -56,11 +56,34 @@ function(ssoclient_glob_tests tests support folder)
   set(${support} ${helpers} PARENT_SCOPE)
 endfunction()
 
+# ssoclient_separate_tests(SOURCE...): compiles each of these test sources on its own, since names in it are also those of
+# something else in a test of its folder.
+function(ssoclient_separate_tests)
+  set_source_files_properties(${ARGN} PROPERTIES SKIP_UNITY_BUILD_INCLUSION ON)
+endfunction()
+
+# ssoclient_merge_tests(TARGET): with CMAKE_UNITY_BUILD, compiles up to eight test sources of a folder as one translation
+# unit, since most of the time goes into the headers and templates that they share.
+function(ssoclient_merge_tests target)
+  set_target_properties(${target} PROPERTIES UNITY_BUILD "${CMAKE_UNITY_BUILD}" UNITY_BUILD_MODE GROUP)
+  get_target_property(sources ${target} SOURCES)
+  list(FILTER sources INCLUDE REGEX "_test\\.cpp$")
+  foreach(source IN LISTS sources)
+    cmake_path(GET source PARENT_PATH folder)
+    string(MAKE_C_IDENTIFIER "tests_${folder}" folder)
+    list(APPEND merged_${folder} "${source}")
+    list(LENGTH merged_${folder} count)
+    math(EXPR group "(${count} - 1) / 8")
+    set_source_files_properties("${source}" PROPERTIES UNITY_GROUP "${folder}_${group}")
+  endforeach()
+endfunction()
+
 # ssoclient_add_test_program(TARGET SHARDS SOURCE...): builds a GoogleTest program, and runs it as SHARDS processes that
 # CTest may run in parallel. With one process for each test, most of the time would be spent starting sanitizers.
 function(ssoclient_add_test_program target shards)
   add_executable(${target} ${ARGN})
   ssoclient_configure_test_target(${target})
+  ssoclient_merge_tests(${target})
   target_link_libraries(${target} PRIVATE GTest::gmock_main)
   add_dependencies(ssoclient_test_programs ${target})
   math(EXPR last "${shards} - 1")
