@@ -1,8 +1,11 @@
+#include <chrono>
 #include <csignal>
 #include <string>
 
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include "support/service_fixture.h"
 
@@ -34,6 +37,45 @@ TEST_F(TerminalTest, AsksForThePasswordWithoutEcho) {
   EXPECT_EQ(result.status, 0) << result.terminal;
   EXPECT_THAT(result.terminal, Not(HasSubstr("secret")));
   EXPECT_THAT(Content(PathOf("token")), HasSubstr("alice"));
+}
+
+TEST_F(TerminalTest, ADescriptorThatIsATerminalIsReadWithoutEcho) {
+  ToolOptions options = Login();
+  options.arguments = Joined(options.arguments, {"--password-fd", "0"});
+  options.in = Stream::kTerminal;
+  ToolProcess tool(options);
+  ASSERT_TRUE(tool.WaitFor(kPrompt));
+  EXPECT_FALSE(tool.IsEchoing());
+  tool.Type("secret\n");
+  const ToolResult result = tool.Finish();
+  EXPECT_EQ(result.status, 0) << result.terminal;
+  EXPECT_THAT(result.terminal, Not(HasSubstr("secret")));
+}
+
+TEST_F(TerminalTest, ATerminalThatCanOnlyBeReadHasNoPromptAndNoEcho) {
+  ToolOptions options = Login();
+  options.arguments = Joined(options.arguments, {"--password-fd", "7"});
+  options.prepare = [] { dup2(open("/dev/tty", O_RDONLY | O_NOCTTY), 7); };
+  ToolProcess tool(options);
+  while (tool.IsEchoing()) {
+    ASSERT_FALSE(tool.WaitFor("anything", std::chrono::milliseconds(1)));
+  }
+  tool.Type("secret\n");
+  const ToolResult result = tool.Finish();
+  EXPECT_EQ(result.status, 0) << result.terminal;
+  EXPECT_THAT(result.terminal, Not(HasSubstr("secret")));
+  EXPECT_THAT(result.terminal, Not(HasSubstr(kPrompt)));
+}
+
+TEST_F(TerminalTest, ALongLineIsNotKept) {
+  ToolProcess tool(Login());
+  ASSERT_TRUE(tool.WaitFor(kPrompt));
+  // Ctrl-D passes on what has been typed without ending the line.
+  tool.Type(std::string(600, 'a') + "\x04");
+  tool.Type(std::string(600, 'a') + "\x04");
+  const ToolResult result = tool.Finish();
+  EXPECT_EQ(result.status, 4);
+  EXPECT_THAT(result.terminal, HasSubstr("longer than 1024 bytes"));
 }
 
 TEST_F(TerminalTest, ASignalRestoresTheTerminalAndEndsTheProcess) {
