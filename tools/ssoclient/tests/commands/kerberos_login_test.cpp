@@ -67,6 +67,7 @@ TEST_F(KerberosLoginTest, LogsInWithTheTicketsOfACache) {
       LogInByKerberos({"--service", kService, "--ccache", TheKerberos().aliceCache});
   ASSERT_EQ(result.status, 0) << result.out << result.err;
   EXPECT_EQ(result.Json()["token"]["subject"]["name"], "alice");
+  EXPECT_EQ(result.err, "");  // nothing that looks like a failure
 }
 
 TEST_F(KerberosLoginTest, LogsInWithAKeytab) {
