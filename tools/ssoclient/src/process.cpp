@@ -6,7 +6,7 @@
 #include <ostream>
 
 #include <fcntl.h>
-#include <sys/resource.h>
+#include <sys/prctl.h>
 #include <unistd.h>
 
 #include "input/descriptor.h"
@@ -35,8 +35,9 @@ void PrepareProcess() {
   OccupyStandardStreams();
   std::signal(SIGPIPE, SIG_IGN);
   std::signal(SIGXFSZ, SIG_IGN);
-  const rlimit none{.rlim_cur = 0, .rlim_max = 0};
-  setrlimit(RLIMIT_CORE, &none);
+  // RLIMIT_CORE would not be enough: it does not hold for dumps that the system passes to a program
+  // (/proc/sys/kernel/core_pattern).
+  prctl(PR_SET_DUMPABLE, 0);
 }
 
 ExitStatus FinishOutput(const Console& console, ExitStatus status) {

@@ -7,8 +7,9 @@
 namespace SsoClient::Tool {
 
 /// Prepares the process for secrets and for failures of its output. Called once, before anything
-/// else: failed writes are errors and not signals, there are no core dumps, and no file that the
-/// program opens takes the place of a standard stream that is closed.
+/// else: failed writes are errors and not signals, and no file that the program opens takes the
+/// place of a standard stream that is closed. The system makes no core dump of the process, and
+/// lets no other process of the user read its memory or trace it; root still can.
 void PrepareProcess();
 
 /// Writes out what is left in `console`. Returns `status`, but `kLocal` after a message if the

@@ -129,7 +129,7 @@ Token LoginCommand::LoginByAny(const Console& console, const ServiceSetup& setup
                                const TokenSpec& spec) const {
   if (kerberos_.IsGiven()) {
     return RunCall<Token>(console, setup,
-                          [handler = kerberos_.MakeHandler(setup.address.host),
+                          [handler = kerberos_.MakeHandler(setup.address.host, mayBeOpen_),
                            spec](const SecurityTokenService& service) {
                             return service.AcquireTokenByGSS(spec, *handler);
                           });

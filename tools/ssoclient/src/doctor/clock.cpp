@@ -3,7 +3,7 @@
 #include <array>
 #include <cmath>
 #include <cstdio>
-#include <ctime>
+#include <string>
 
 namespace SsoClient::Tool::Doctor {
 namespace {
@@ -17,16 +17,6 @@ std::string Seconds(double value) {
 }
 
 }  // namespace
-
-std::optional<long> ParseHttpDate(const std::string& text) {
-  std::tm fields{};
-  // The program never sets a locale, so that the names are English.
-  const char* end = strptime(text.c_str(), "%a, %d %b %Y %H:%M:%S GMT", &fields);
-  if (end == nullptr || *end != '\0') {
-    return std::nullopt;
-  }
-  return timegm(&fields);
-}
 
 ClockOffset OffsetOf(long serviceTime, long sentAt, long receivedAt) {
   constexpr double kHalfSecond = 0.5;

@@ -1,9 +1,6 @@
 #ifndef SSOCLIENT_TOOL_DOCTOR_CLOCK_H
 #define SSOCLIENT_TOOL_DOCTOR_CLOCK_H
 
-#include <optional>
-#include <string>
-
 #include "doctor/report.h"
 
 namespace SsoClient::Tool::Doctor {
@@ -15,9 +12,6 @@ struct ClockOffset {
   /// the Date does not divide.
   double uncertainty = 0;
 };
-
-/// The Unix time of a Date in the preferred form (RFC 9110, section 5.6.7); nothing for any other.
-std::optional<long> ParseHttpDate(const std::string& text);
 
 /// The offset when a request sent at `sentAt` and answered at `receivedAt`, both in microseconds of
 /// Unix time on this machine, has the Date `serviceTime` in seconds of Unix time.

@@ -6,6 +6,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "input/private_file.h"
+
 namespace SsoClient::Tool::Doctor {
 namespace {
 
@@ -38,9 +40,15 @@ std::optional<Finding> FileProblem(const std::string& path) {
 
 std::optional<Finding> PermissionProblem(const std::string& path) {
   struct stat status {};
-  if (stat(path.c_str(), &status) != 0 ||
-      (status.st_mode & (S_IRGRP | S_IWGRP | S_IROTH | S_IWOTH)) == 0) {
+  const bool isKnown = stat(path.c_str(), &status) == 0;
+  const Exposure exposure = isKnown ? ExposureOf(status, geteuid()) : Exposure::kNone;
+  if (exposure == Exposure::kNone) {
     return std::nullopt;
+  }
+  if (exposure == Exposure::kByOwner) {
+    return Warning(ExitStatus::kLocal, "key-readable-by-others",
+                   Quoted(path) + ", which contains a key, belongs to another user",
+                   "use a file of your own; other commands refuse it without --allow-open-files");
   }
   return Warning(
       ExitStatus::kLocal, "key-readable-by-others",

@@ -1,5 +1,8 @@
+#include <optional>
+
 #include "doctor/clock.h"
 #include "doctor/steps.h"
+#include "service/http_date.h"
 
 namespace SsoClient::Tool::Doctor {
 

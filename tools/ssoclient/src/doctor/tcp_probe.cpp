@@ -3,9 +3,9 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <string_view>
 
 #include <poll.h>
-#include <unistd.h>
 
 namespace SsoClient::Tool::Doctor {
 namespace {
@@ -17,12 +17,12 @@ TcpAttempt Begin(const Address& address) {
   attempt.address = address;
   attempt.socket =
       Descriptor(socket(address.octets.ss_family, SOCK_STREAM | SOCK_NONBLOCK | SOCK_CLOEXEC, 0));
-  if (attempt.socket.Number() < 0) {
+  if (attempt.socket.Get() < 0) {
     attempt.error = errno;
     return attempt;
   }
   const auto* octets = reinterpret_cast<const sockaddr*>(&address.octets);
-  const bool isDone = connect(attempt.socket.Number(), octets, address.size) == 0;
+  const bool isDone = connect(attempt.socket.Get(), octets, address.size) == 0;
   attempt.error = isDone ? 0 : errno;
   return attempt;
 }
@@ -42,7 +42,7 @@ bool Await(std::vector<TcpAttempt>& attempts, Clock::time_point start, Clock::ti
   std::vector<pollfd> polled;
   for (const TcpAttempt& attempt : attempts) {
     // poll skips negative descriptors.
-    polled.push_back({IsOpen(attempt) ? attempt.socket.Number() : -1, POLLOUT, 0});
+    polled.push_back({IsOpen(attempt) ? attempt.socket.Get() : -1, POLLOUT, 0});
   }
   const int wait = MillisecondsUntil(end);
   const int ready = poll(polled.data(), polled.size(), wait);
@@ -73,12 +73,6 @@ bool WaitFor(int socket, short event, Clock::time_point end) {
 }
 
 }  // namespace
-
-Descriptor::~Descriptor() {
-  if (number_ >= 0) {
-    close(number_);
-  }
-}
 
 std::vector<TcpAttempt> ConnectToAll(const std::vector<Address>& addresses, Clock::time_point end) {
   const Clock::time_point start = Clock::now();
@@ -115,20 +109,14 @@ Reading ReadSome(int socket, Clock::time_point end, std::string& octets) {
   return size == 0 ? Reading::kEnd : Reading::kFailed;
 }
 
-bool WriteAll(int socket, const std::string& octets, Clock::time_point end) {
-  std::size_t written = 0;
-  while (written < octets.size()) {
+bool SendAll(int socket, const std::string& octets, Clock::time_point end) {
+  return WriteAll(octets, [&](std::string_view rest) -> ssize_t {
     if (!WaitFor(socket, POLLOUT, end)) {
-      return false;
+      return -1;
     }
-    const ssize_t size =
-        send(socket, octets.data() + written, octets.size() - written, MSG_NOSIGNAL);
-    if (size < 0 && errno != EAGAIN && errno != EINTR) {
-      return false;
-    }
-    written += static_cast<std::size_t>(std::max<ssize_t>(size, 0));
-  }
-  return true;
+    const ssize_t size = send(socket, rest.data(), rest.size(), MSG_NOSIGNAL);
+    return size < 0 && (errno == EAGAIN || errno == EINTR) ? 0 : size;
+  });
 }
 
 }  // namespace SsoClient::Tool::Doctor

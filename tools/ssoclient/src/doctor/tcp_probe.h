@@ -3,31 +3,13 @@
 
 #include <chrono>
 #include <string>
-#include <utility>
 #include <vector>
 
 #include "doctor/address.h"
 #include "doctor/time_limit.h"
+#include "input/descriptor.h"
 
 namespace SsoClient::Tool::Doctor {
-
-/// Owns a file descriptor.
-class Descriptor {
- public:
-  Descriptor() = default;
-  explicit Descriptor(int number) noexcept : number_(number) {}
-  Descriptor(Descriptor&& other) noexcept : number_(std::exchange(other.number_, -1)) {}
-  Descriptor& operator=(Descriptor&& other) noexcept {
-    std::swap(number_, other.number_);
-    return *this;
-  }
-  ~Descriptor();
-
-  int Number() const noexcept { return number_; }
-
- private:
-  int number_ = -1;
-};
 
 /// A connection that was tried.
 struct TcpAttempt {
@@ -48,8 +30,8 @@ enum class Reading { kOctets, kEnd, kTimedOut, kFailed };
 
 /// Waits for octets until `end` and appends them to `octets`.
 Reading ReadSome(int socket, TimeLimit::Clock::time_point end, std::string& octets);
-/// Writes everything; false when that fails or takes longer than until `end`.
-bool WriteAll(int socket, const std::string& octets, TimeLimit::Clock::time_point end);
+/// Sends everything; false when that fails or takes longer than until `end`.
+bool SendAll(int socket, const std::string& octets, TimeLimit::Clock::time_point end);
 
 }  // namespace SsoClient::Tool::Doctor
 

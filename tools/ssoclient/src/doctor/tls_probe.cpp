@@ -123,7 +123,7 @@ class Handshake {
     const long size = BIO_get_mem_data(SSL_get_wbio(ssl_.get()), &octets);
     const std::string text(octets, static_cast<std::size_t>(std::max(size, 0L)));
     static_cast<void>(BIO_reset(SSL_get_wbio(ssl_.get())));
-    WriteAll(socket, text, end);
+    SendAll(socket, text, end);
   }
 
   bool Fill(int socket, Clock::time_point end) {
@@ -179,16 +179,16 @@ TlsAttempt TryTls(const Address& address, const std::string& serverName, TlsOffe
     return attempt;
   }
   const OwnedContext context = MakeContext(offer);
-  Handshake(context.get(), serverName, attempt).Run(connections.front().socket.Number(), end);
+  Handshake(context.get(), serverName, attempt).Run(connections.front().socket.Get(), end);
   return attempt;
 }
 
 std::string TryPlainHttp(const Address& address, const std::string& host, Clock::time_point end) {
   const std::vector<TcpAttempt> connections = ConnectToAll({address}, end);
-  const int socket = connections.front().socket.Number();
+  const int socket = connections.front().socket.Get();
   const std::string request = "HEAD / HTTP/1.1\r\nHost: " + host + "\r\nConnection: close\r\n\r\n";
   std::string answer;
-  if (connections.front().error == 0 && WriteAll(socket, request, end)) {
+  if (connections.front().error == 0 && SendAll(socket, request, end)) {
     ReadSome(socket, end, answer);
   }
   return answer;

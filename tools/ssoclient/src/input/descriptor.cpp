@@ -1,7 +1,6 @@
 #include "input/descriptor.h"
 
 #include <system_error>
-#include <utility>
 
 #include <unistd.h>
 
@@ -17,15 +16,9 @@ bool Descriptor::Close() noexcept {
 }
 
 bool WriteAll(int descriptor, std::string_view text) {
-  while (!text.empty()) {
-    const ssize_t written =
-        RetryInterrupted([&] { return write(descriptor, text.data(), text.size()); });
-    if (written < 0) {
-      return false;
-    }
-    text.remove_prefix(static_cast<std::size_t>(written));
-  }
-  return true;
+  return WriteAll(text, [descriptor](std::string_view rest) {
+    return RetryInterrupted([&] { return write(descriptor, rest.data(), rest.size()); });
+  });
 }
 
 std::string SystemMessage(int error) {

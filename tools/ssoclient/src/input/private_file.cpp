@@ -22,24 +22,54 @@ namespace {
   throw ToolException({ExitStatus::kLocal, what + "-file", message, remedy});
 }
 
-// Passed on with the file, so that what is checked is what is read.
-void CheckMode(int descriptor, const PrivateFile& file) {
+[[noreturn]] void FailAsOpen(const PrivateFile& file, const std::string& message,
+                             const std::string& remedy) {
+  throw ToolException({ExitStatus::kLocal, file.what + "-file-open", message,
+                       remedy + ", or allow it with --allow-open-files"});
+}
+
+Descriptor Open(const PrivateFile& file, int flags) {
+  Descriptor descriptor(open(file.path.c_str(), flags | O_RDONLY | O_CLOEXEC | O_NOCTTY));
+  if (descriptor.Get() < 0) {
+    Fail(file.what,
+         "cannot open the " + file.what + " file " + file.path + ": " + SystemMessage(errno));
+  }
+  return descriptor;
+}
+
+// Of the descriptor, so that what is checked is what is read.
+struct stat StatusOf(const Descriptor& descriptor, const PrivateFile& file) {
   struct stat status {};
-  if (fstat(descriptor, &status) != 0) {
+  if (fstat(descriptor.Get(), &status) != 0) {
     Fail(file.what, "cannot read " + file.path + ": " + SystemMessage(errno));
   }
   if (S_ISDIR(status.st_mode)) {
     Fail(file.what, file.path + " is a folder");
   }
-  const mode_t others = S_IRGRP | S_IWGRP | S_IROTH | S_IWOTH;
-  if ((status.st_mode & others) != 0 && !file.mayBeOpen) {
-    throw ToolException({ExitStatus::kLocal, file.what + "-file-open",
-                         "other users can read or change the " + file.what + " file " + file.path,
-                         "run 'chmod 600' on it, or allow it with --allow-open-files"});
+  return status;
+}
+
+void RequireNoExposure(const struct stat& status, const PrivateFile& file) {
+  const Exposure exposure = file.mayBeOpen ? Exposure::kNone : ExposureOf(status, geteuid());
+  const std::string name = "the " + file.what + " file " + file.path;
+  if (exposure == Exposure::kByOwner) {
+    FailAsOpen(file, name + " belongs to another user, who can read and change it",
+               "use a file of your own");
+  }
+  if (exposure == Exposure::kByMode) {
+    FailAsOpen(file, "other users can read or change " + name, "run 'chmod 600' on it");
   }
 }
 
 }  // namespace
+
+Exposure ExposureOf(const struct stat& status, uid_t user) {
+  if (status.st_uid != user && status.st_uid != 0) {
+    return Exposure::kByOwner;
+  }
+  const mode_t others = S_IRGRP | S_IWGRP | S_IROTH | S_IWOTH;
+  return (status.st_mode & others) != 0 ? Exposure::kByMode : Exposure::kNone;
+}
 
 void AddOpenFilesOption(CLI::App& command, bool& mayBeOpen) {
   command.add_flag("--allow-open-files", mayBeOpen,
@@ -47,13 +77,21 @@ void AddOpenFilesOption(CLI::App& command, bool& mayBeOpen) {
 }
 
 SecretText ReadPrivateFile(const PrivateFile& file) {
-  const Descriptor descriptor(open(file.path.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY));
-  if (descriptor.Get() < 0) {
-    Fail(file.what,
-         "cannot open the " + file.what + " file " + file.path + ": " + SystemMessage(errno));
+  const Descriptor descriptor = Open(file, 0);
+  const struct stat status = StatusOf(descriptor, file);
+  if (file.isPublic == nullptr) {
+    RequireNoExposure(status, file);
   }
-  CheckMode(descriptor.Get(), file);
-  return ReadDescriptor(descriptor.Get(), file.path, file.what, file.maxBytes);
+  SecretText content = ReadDescriptor(descriptor.Get(), file.path, file.what, file.maxBytes);
+  if (file.isPublic != nullptr && !file.isPublic(content.Text())) {
+    RequireNoExposure(status, file);
+  }
+  return content;
+}
+
+void CheckPrivateFile(const PrivateFile& file) {
+  // A pipe may have nobody yet who writes.
+  RequireNoExposure(StatusOf(Open(file, O_NONBLOCK), file), file);
 }
 
 SecretText ReadDescriptor(int descriptor, const std::string& name, const std::string& what,

@@ -67,14 +67,15 @@ SecretText SecretOption::ReadUnchecked(const std::string& prompt, bool mayBeOpen
         {.path = file_, .what = name_, .maxBytes = kMaxSecretFileBytes, .mayBeOpen = mayBeOpen});
   }
   if (descriptor_ >= 0) {
-    return ReadLine(descriptor_, name_);
+    return isatty(descriptor_) == 1 ? ReadFromTerminal(descriptor_, prompt, kMaxSecretBytes)
+                                    : ReadLine(descriptor_, name_);
   }
   if (!HasTerminal()) {
     throw ToolException({ExitStatus::kUsage, "no-" + name_,
                          "there is no terminal to ask for the " + name_,
                          "use --" + name_ + "-file or --" + name_ + "-fd"});
   }
-  return ReadFromTerminal(prompt);
+  return ReadFromTerminal(prompt, kMaxSecretBytes);
 }
 
 SecretText SecretOption::Read(const std::string& prompt, bool mayBeOpen) const {

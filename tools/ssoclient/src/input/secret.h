@@ -22,10 +22,11 @@ class SecretOption {
   bool IsGiven() const { return !file_.empty() || descriptor_ >= 0; }
 
   /// The secret: the first line of the file or the descriptor, or what the user types at the
-  /// terminal of the process without echo after `prompt`. What is after the first line of a
-  /// descriptor stays there for others. Throws `ToolException` when there is neither (with the
-  /// status `kUsage`), when the secret is empty or longer than 1024 bytes, when a file can be read
-  /// by others, unless `mayBeOpen`, and when it cannot be read.
+  /// terminal of the process after `prompt`. A descriptor that is a terminal is read in the same
+  /// way: without echo. What is after the first line of another descriptor stays there for others.
+  /// Throws `ToolException` when there is neither (with the status `kUsage`), when the secret is
+  /// empty or longer than 1024 bytes, when a file can be read by others, unless `mayBeOpen`, and
+  /// when it cannot be read.
   SecretText Read(const std::string& prompt, bool mayBeOpen) const;
 
  private:

@@ -51,7 +51,11 @@ void SecretText::Truncate(std::size_t size) {
 void SecretText::Trim() {
   const std::size_t last = text_.find_last_not_of(kWhiteSpace);
   Truncate(last == std::string::npos ? 0 : last + 1);
-  text_.erase(0, text_.find_first_not_of(kWhiteSpace));
+  const std::size_t first = text_.find_first_not_of(kWhiteSpace);
+  if (first != std::string::npos) {
+    std::move(text_.begin() + static_cast<std::ptrdiff_t>(first), text_.end(), text_.begin());
+    Truncate(text_.size() - first);
+  }
 }
 
 }  // namespace SsoClient::Tool

@@ -20,7 +20,7 @@ class SecretText {
   void Append(const char* data, std::size_t size);
   /// Overwrites and removes what is after the first `size` bytes.
   void Truncate(std::size_t size);
-  /// Removes white space at both ends.
+  /// Removes white space at both ends. What it removes is overwritten, too.
   void Trim();
 
   const std::string& Text() const noexcept { return text_; }

@@ -104,7 +104,8 @@ class QuietTerminal {
 };
 
 // Returns the signal that has interrupted it, or 0 after a line or the end of input.
-int ReadLineQuietly(int terminal, const sigset_t& arrivals, SecretText& line) {
+int ReadLineQuietly(int terminal, const sigset_t& arrivals, std::size_t maxBytes,
+                    SecretText& line) {
   std::array<char, 256> buffer{};
   for (;;) {
     pollfd waiting{.fd = terminal, .events = POLLIN, .revents = 0};
@@ -128,19 +129,19 @@ int ReadLineQuietly(int terminal, const sigset_t& arrivals, SecretText& line) {
     if (isLine) {
       line.Truncate(line.Text().size() - 1);
     }
-    if (isLine || size == 0) {
+    if (isLine || size == 0 || line.Text().size() > maxBytes) {
       return 0;
     }
   }
 }
 
-int Ask(int terminal, const std::string& prompt, SecretText& line) {
+int Ask(int terminal, const std::string& prompt, std::size_t maxBytes, SecretText& line) {
   const CaughtSignals signals;
   const QuietTerminal quiet(terminal);
-  if (!WriteAll(terminal, prompt)) {
+  if (!WriteAll(terminal, prompt) && errno != EBADF) {
     FailWithTerminal(errno);
   }
-  return ReadLineQuietly(terminal, signals.Arrivals(), line);
+  return ReadLineQuietly(terminal, signals.Arrivals(), maxBytes, line);
 }
 
 }  // namespace
@@ -149,14 +150,18 @@ bool HasTerminal() {
   return Descriptor(OpenTerminal()).Get() >= 0;
 }
 
-SecretText ReadFromTerminal(const std::string& prompt) {
+SecretText ReadFromTerminal(const std::string& prompt, std::size_t maxBytes) {
   const Descriptor terminal(OpenTerminal());
   if (terminal.Get() < 0) {
     FailWithTerminal(errno);
   }
+  return ReadFromTerminal(terminal.Get(), prompt, maxBytes);
+}
+
+SecretText ReadFromTerminal(int descriptor, const std::string& prompt, std::size_t maxBytes) {
   for (;;) {
     SecretText line;
-    const int signal = Ask(terminal.Get(), prompt, line);
+    const int signal = Ask(descriptor, prompt, maxBytes, line);
     if (signal == 0) {
       return line;
     }

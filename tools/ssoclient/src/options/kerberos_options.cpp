@@ -10,9 +10,22 @@
 #include <tarnik/core/exception.h>
 
 #include "failure.h"
+#include "input/private_file.h"
 
 namespace SsoClient::Tool {
 namespace {
+
+// The type of a keytab is before the first colon, as in "FILE:/etc/krb5.keytab", unless a slash
+// comes first.
+std::size_t LengthOfType(const std::string& keytab) {
+  const std::size_t end = keytab.find_first_of(":/");
+  return end != std::string::npos && keytab[end] == ':' ? end + 1 : 0;
+}
+
+std::string CheckKeytab(const std::string& keytab) {
+  const std::string type = keytab.substr(0, LengthOfType(keytab));
+  return type.empty() || type == "FILE:" ? "" : "it must be a file";
+}
 
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
 /// Turns failures of Kerberos, which has not asked the service yet, into failures of this machine.
@@ -69,21 +82,31 @@ CLI::Option* KerberosOptions::AddTo(CLI::App& command, const std::string& group)
       ->group(group);
   command.add_option("--keytab", keytab_, "Get tickets with the keys of this keytab")
       ->type_name("FILE")
+      ->check(CheckKeytab)
       ->needs(kerberos)
       ->group(group);
   return kerberos;
 }
 
-std::shared_ptr<NegotiationHandler> KerberosOptions::MakeHandler(const std::string& host) const {
+std::string KerberosOptions::Keytab() const {
+  return keytab_.substr(LengthOfType(keytab_));
+}
+
+std::shared_ptr<NegotiationHandler> KerberosOptions::MakeHandler(const std::string& host,
+                                                                 bool mayBeOpen) const {
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
+  if (!keytab_.empty()) {
+    CheckPrivateFile({.path = Keytab(), .what = "keytab", .mayBeOpen = mayBeOpen});
+  }
   GssapiNegotiationConfig config;
   config.targetService = service_.empty() ? "HTTP@" + host : service_;
   config.principal = principal_;
-  config.keytab = keytab_;
+  config.keytab = keytab_.empty() ? keytab_ : "FILE:" + Keytab();
   config.credentialCache = credentialCache_;
   return Create(config);
 #else
   (void)host;
+  (void)mayBeOpen;
   throw ToolException({ExitStatus::kUsage, "no-kerberos", "this program was built without Kerberos",
                        "log in in another way"});
 #endif

@@ -25,12 +25,14 @@ class KerberosOptions {
   const std::string& Service() const { return service_; }
   const std::string& Principal() const { return principal_; }
   const std::string& CredentialCache() const { return credentialCache_; }
-  const std::string& Keytab() const { return keytab_; }
+  /// The path of the keytab, which may be empty.
+  std::string Keytab() const;
 
   /// Creates the legs of a login to the service on `host`, which --service replaces. Failures of
   /// Kerberos are `ToolException`s of the kind "kerberos". Throws `ToolException` for a malformed
-  /// --service, and when the program was built without Kerberos.
-  std::shared_ptr<NegotiationHandler> MakeHandler(const std::string& host) const;
+  /// --service, for a keytab that cannot be read or that others can read or change, unless
+  /// `mayBeOpen`, and when the program was built without Kerberos.
+  std::shared_ptr<NegotiationHandler> MakeHandler(const std::string& host, bool mayBeOpen) const;
 
  private:
   std::string service_;

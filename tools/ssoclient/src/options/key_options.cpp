@@ -40,14 +40,17 @@ bool IsPkcs12(std::string_view content) {
   return content.substr(std::min(2 + lengthBytes, content.size())).starts_with(kVersion);
 }
 
+// Certificates are public.
+bool HasNoKey(std::string_view content) {
+  return !HasPrivateKeyBlock(content) && !IsPkcs12(content);
+}
+
 SecretText ReadKeyFile(const std::string& path, bool mayBeOpen) {
-  SecretText content =
-      ReadPrivateFile({.path = path, .what = "key", .maxBytes = kMaxFileBytes, .mayBeOpen = true});
-  if (mayBeOpen || !(HasPrivateKeyBlock(content.Text()) || IsPkcs12(content.Text()))) {
-    return content;  // certificates are public
-  }
-  return ReadPrivateFile(
-      {.path = path, .what = "key", .maxBytes = kMaxFileBytes, .mayBeOpen = false});
+  return ReadPrivateFile({.path = path,
+                          .what = "key",
+                          .maxBytes = kMaxFileBytes,
+                          .isPublic = HasNoKey,
+                          .mayBeOpen = mayBeOpen});
 }
 
 // Whether it begins with a scheme (RFC 3986, section 3.1). A file of such a name is "./a:b".
@@ -60,6 +63,16 @@ bool IsUri(const std::string& text) {
          std::isalpha(static_cast<unsigned char>(text[0])) != 0 &&
          std::all_of(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(colon),
                      isSchemeCharacter);
+}
+
+// OpenSSL would read the file of a "file:" URI itself, whoever can read or change it.
+std::string CheckKey(const std::string& key) {
+  constexpr std::string_view kFileScheme = "file:";
+  const bool isFileUri =
+      key.size() >= kFileScheme.size() &&
+      std::equal(kFileScheme.begin(), kFileScheme.end(), key.begin(),
+                 [](unsigned char a, unsigned char b) { return a == std::tolower(b); });
+  return isFileUri ? "name a file by its path, not by a URI" : std::string();
 }
 
 Tarnik::Crypto::KeyAndCertificate ReadPkcs12(const SecretText& content,
@@ -92,6 +105,7 @@ CLI::Option* KeyOptions::AddTo(CLI::App& command, bool isRequired) {
                   "The private key of the certificate: a PEM or PKCS#12 file, or a URI such as "
                   "pkcs11:object=me of a provider that OpenSSL is configured for")
       ->type_name("FILE|URI")
+      ->check(CheckKey)
       ->needs(certificate)
       ->group(group);
   passphrase_.AddTo(command, "passphrase", group);

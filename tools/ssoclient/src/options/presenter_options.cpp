@@ -1,8 +1,7 @@
 #include "options/presenter_options.h"
 
 #include <array>
-#include <fstream>
-#include <iterator>
+#include <cstddef>
 #include <vector>
 
 #include <CLI/CLI.hpp>
@@ -12,11 +11,14 @@
 #include <tarnik/crypto/data_signature.h>
 
 #include "failure.h"
+#include "input/private_file.h"
 
 namespace SsoClient::Tool {
 namespace {
 
 using Tarnik::Crypto::SignatureAlgorithm;
+
+constexpr std::size_t kMaxProofBytes = std::size_t{16} * 1024 * 1024;
 
 struct NamedAlgorithm {
   const char* name;
@@ -60,13 +62,14 @@ std::string CheckAlgorithm(const std::string& name) {
       {ExitStatus::kLocal, "proof-file", "cannot read " + path + ": " + reason, ""});
 }
 
+// Neither the data nor its signature is secret.
 std::string ReadFile(const std::string& path) {
-  std::ifstream file(path, std::ios::binary);
-  std::string content(std::istreambuf_iterator<char>(file), {});
-  if (!file.is_open() || file.bad() || content.empty()) {
-    FailToRead(path, file.is_open() ? "it is empty" : "it cannot be opened");
+  const SecretText content = ReadPrivateFile(
+      {.path = path, .what = "proof", .maxBytes = kMaxProofBytes, .mayBeOpen = true});
+  if (content.Text().empty()) {
+    FailToRead(path, "it is empty");
   }
-  return content;
+  return content.Text();
 }
 
 Tarnik::Ref<const Tarnik::Crypto::Certificate> ReadCertificate(const std::string& path) {
@@ -89,7 +92,8 @@ void PresenterOptions::AddTo(CLI::App& command) {
           ->group("Proof");
   CLI::Option* const data =
       command
-          .add_option("--proof-data", dataPath_, "The data that the sender of the token has signed")
+          .add_option("--proof-data", dataPath_,
+                      "The data that the sender of the token has signed, at most 16 MiB")
           ->type_name("FILE")
           ->excludes(certificate)
           ->group("Proof");

@@ -62,13 +62,13 @@ bool IsLocaleUtf8() {
   return false;
 }
 
-int ColumnsOf(int descriptor) {
+}  // namespace
+
+int ColumnsOfTerminal(int descriptor) {
   winsize size{};
   const bool isKnown = ioctl(descriptor, TIOCGWINSZ, &size) == 0 && size.ws_col > 0;
   return isKnown ? size.ws_col : kDefaultColumns;
 }
-
-}  // namespace
 
 Console Console::OfProcess() {
   const bool outIsTerminal = isatty(STDOUT_FILENO) == 1;
@@ -80,7 +80,7 @@ Console Console::OfProcess() {
           .errIsTerminal = errIsTerminal,
           .outHasColours = outIsTerminal && welcome,
           .errHasColours = errIsTerminal && welcome,
-          .columns = outIsTerminal ? ColumnsOf(STDOUT_FILENO) : kDefaultColumns,
+          .columns = ColumnsOfTerminal(STDOUT_FILENO),
           .isUtf8 = IsLocaleUtf8()};
 }
 

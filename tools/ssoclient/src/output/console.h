@@ -9,6 +9,9 @@ namespace SsoClient::Tool {
 
 enum class Colour { kGood, kBad, kWarning, kFaint, kStrong };
 
+/// The columns of the terminal of this descriptor; 80 if it has none.
+int ColumnsOfTerminal(int descriptor);
+
 /// Where a command writes. Results go to `out`, progress and failures to `err`.
 struct Console {
   std::ostream& out;

@@ -3,28 +3,17 @@
 #include <algorithm>
 #include <ostream>
 
-#include <sys/ioctl.h>
 #include <unistd.h>
 
 namespace SsoClient::Tool {
-namespace {
-
-constexpr std::size_t kBarColumns = 80;
-
-std::size_t ColumnsOfTerminal() {
-  winsize size{};
-  const bool isKnown = ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 1;
-  return isKnown ? size.ws_col : kBarColumns;
-}
-
-}  // namespace
 
 void ProgressLine::Show(const std::string& text) {
   if (!console_.errIsTerminal) {
     return;
   }
   // In the last column, some terminals would begin another line.
-  const std::string line = text.substr(0, ColumnsOfTerminal() - 1);
+  const auto columns = static_cast<std::size_t>(ColumnsOfTerminal(STDERR_FILENO));
+  const std::string line = text.substr(0, columns - 1);
   // Blanks overwrite what the last line was longer by, also on a terminal without control codes.
   console_.err << '\r' << line << std::string(shown_ - std::min(shown_, line.size()), ' ')
                << std::flush;

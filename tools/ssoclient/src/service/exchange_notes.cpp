@@ -1,12 +1,11 @@
 #include "service/exchange_notes.h"
 
 #include <ctime>
-#include <string>
 #include <utility>
 
-#include <time.h>
-
 #include <tarnik/core/object_impl.h>
+
+#include "service/http_date.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -14,13 +13,6 @@ namespace {
 using Tarnik::Ref;
 using Tarnik::Http::ClientResponse;
 using Tarnik::Http::PendingRequestItem;
-
-// Only the form that servers must send (RFC 9110, section 5.6.7). The program uses the locale "C".
-std::optional<std::time_t> ParseDate(const std::string& text) {
-  std::tm fields{};
-  const char* const end = strptime(text.c_str(), "%a, %d %b %Y %H:%M:%S GMT", &fields);
-  return end != nullptr && *end == '\0' ? std::optional(timegm(&fields)) : std::nullopt;
-}
 
 class NotingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::ObjectImpl {
  public:
@@ -51,7 +43,7 @@ class NotingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::Obj
     notes_->failure = nullptr;
     notes_->httpStatus = response.Status().code;
     const auto header = response.Header("Date");
-    if (const auto date = header ? ParseDate(*header) : std::nullopt) {
+    if (const auto date = header ? ParseHttpDate(*header) : std::nullopt) {
       notes_->clockOffsetSec = *date - std::time(nullptr);
     }
   }

@@ -25,6 +25,7 @@
 #include "service/call_failure.h"
 #include "service/exchange_notes.h"
 #include "service/interruption.h"
+#include "service/library_log.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -167,6 +168,7 @@ void RunCall(const Console& console, const ServiceSetup& setup,
   call->operation = std::move(operation);
   call->service = MakeService(setup, *call);
 
+  const LibraryLog log;
   Interruption interruption;
   Tarnik::System::GetThreadPool()->Run([call] { call->Run(); });
   const int signal = WaitForEnd(console, *call, interruption, setup.timeoutSec);
@@ -175,6 +177,7 @@ void RunCall(const Console& console, const ServiceSetup& setup,
     WaitUntil(*call, Clock::now() + kGrace);
     interruption.EndBy(signal);
   }
+  log.Print(console, setup.secret);
   if (!call->hasEnded) {
     isCallAbandoned = true;
     throw ToolException(MakeFailure(Access::FailureKind::kTimedOut,

@@ -36,7 +36,8 @@ struct ServiceSetup {
 /// terminal after two seconds. Throws what `operation` throws, but exceptions of the client as
 /// `ToolException`s with the exact kind, and one of the kind "timed-out" after the time of the
 /// setup. An operation that does not end then, since it is not waiting for the service, is
-/// abandoned (`IsCallAbandoned`), so it must own what it uses.
+/// abandoned (`IsCallAbandoned`), so it must own what it uses. Warnings of the libraries go to
+/// `console.err` when the call has ended (`LibraryLog`).
 ///
 /// When a signal asks the process to end, the call is cancelled and the process ends by the signal.
 void RunCall(const Console& console, const ServiceSetup& setup,

@@ -1,10 +1,13 @@
+#include <filesystem>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 #include <stdlib.h>
+#include <sys/stat.h>
 
 #include <devsts/kerberos_realm.h>
 
@@ -64,6 +67,7 @@ TEST_F(KerberosLoginTest, LogsInWithTheTicketsOfACache) {
       LogInByKerberos({"--service", kService, "--ccache", TheKerberos().aliceCache});
   ASSERT_EQ(result.status, 0) << result.out << result.err;
   EXPECT_EQ(result.Json()["token"]["subject"]["name"], "alice");
+  EXPECT_EQ(result.err, "");  // nothing that looks like a failure
 }
 
 TEST_F(KerberosLoginTest, LogsInWithAKeytab) {
@@ -71,6 +75,28 @@ TEST_F(KerberosLoginTest, LogsInWithAKeytab) {
       {"--service", kService, "--principal", "machine", "--keytab", TheKerberos().machineKeytab});
   ASSERT_EQ(result.status, 0) << result.out << result.err;
   EXPECT_EQ(result.Json()["token"]["subject"]["name"], "machine");
+}
+
+TEST_F(KerberosLoginTest, AKeytabIsAPrivateFile) {
+  const std::string keytab = PathOf("machine.keytab");
+  std::filesystem::copy_file(TheKerberos().machineKeytab, keytab);
+  chmod(keytab.c_str(), 0600);
+  const std::vector<std::string> login{"--service", kService, "--principal", "machine", "--keytab"};
+  EXPECT_EQ(LogInByKerberos(Joined(login, {"FILE:" + keytab})).status, 0);
+
+  chmod(keytab.c_str(), 0640);
+  for (const std::string& name : {keytab, "FILE:" + keytab}) {
+    const ToolResult result = LogInByKerberos(Joined(login, {name}));
+    EXPECT_EQ(result.status, 4);
+    EXPECT_EQ(result.Json()["error"]["kind"], "keytab-file-open") << result.out;
+    EXPECT_EQ(LogInByKerberos(Joined(login, {name, "--allow-open-files"})).status, 0);
+  }
+  const ToolResult missing = LogInByKerberos(Joined(login, {PathOf("none")}));
+  EXPECT_EQ(missing.status, 4);
+  EXPECT_EQ(missing.Json()["error"]["kind"], "keytab-file");
+  const ToolResult other = LogInByKerberos(Joined(login, {"MEMORY:keys"}));
+  EXPECT_EQ(other.status, 2);
+  EXPECT_THAT(other.out, HasSubstr("--keytab: it must be a file"));
 }
 
 TEST_F(KerberosLoginTest, WithoutTicketsItIsAFailureOfThisMachine) {

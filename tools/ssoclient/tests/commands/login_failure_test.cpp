@@ -74,6 +74,26 @@ TEST_F(LoginFailureTest, ThePasswordIsNeverInAMessage) {
   }
 }
 
+TEST_F(LoginFailureTest, TheServicesReasonIsShownUnlessItHasThePassword) {
+  const auto refuse = [this](const std::string& reason) {
+    DevSts::Misbehavior fault;
+    fault.fault = DevSts::FaultAnswer{
+        "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd",
+        "MessageExpired", reason, false, 500};
+    Sts().SetMisbehavior(fault);
+    const ToolResult result = RunTool(PasswordLogin({"-o", PathOf("token")}));
+    EXPECT_EQ(result.status, 1);
+    return result.err;
+  };
+  EXPECT_THAT(refuse("Your clock is slow"),
+              HasSubstr("ssoclient: The service answered with fault `wsu:MessageExpired': Your "
+                        "clock is slow\n"));
+  const std::string hidden = refuse("Your clock is slow, and your password secret");
+  EXPECT_THAT(hidden, HasSubstr("MessageExpired"));
+  EXPECT_THAT(hidden, Not(HasSubstr("password secret")));
+  EXPECT_THAT(refuse("turned\xe2\x80\xae"), Not(HasSubstr("\xe2\x80\xae")));
+}
+
 TEST_F(LoginFailureTest, WithoutAUsableAnswerTheStatusIs3) {
   Fail(LoginTo("https://127.0.0.1:1/"), 3, "unreachable");
   Fail(LoginTo("https://localhost:" + std::to_string(Sts().HttpPort()) + "/sts"), 3, "tls");

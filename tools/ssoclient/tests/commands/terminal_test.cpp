@@ -1,8 +1,11 @@
+#include <chrono>
 #include <csignal>
 #include <string>
 
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include "support/service_fixture.h"
 
@@ -34,6 +37,48 @@ TEST_F(TerminalTest, AsksForThePasswordWithoutEcho) {
   EXPECT_EQ(result.status, 0) << result.terminal;
   EXPECT_THAT(result.terminal, Not(HasSubstr("secret")));
   EXPECT_THAT(Content(PathOf("token")), HasSubstr("alice"));
+}
+
+TEST_F(TerminalTest, ADescriptorThatIsATerminalIsReadWithoutEcho) {
+  ToolOptions options = Login();
+  options.arguments = Joined(options.arguments, {"--password-fd", "0"});
+  options.in = Stream::kTerminal;
+  ToolProcess tool(options);
+  ASSERT_TRUE(tool.WaitFor(kPrompt));
+  EXPECT_FALSE(tool.IsEchoing());
+  tool.Type("secret\n");
+  const ToolResult result = tool.Finish();
+  EXPECT_EQ(result.status, 0) << result.terminal;
+  EXPECT_THAT(result.terminal, Not(HasSubstr("secret")));
+}
+
+TEST_F(TerminalTest, ATerminalThatCanOnlyBeReadHasNoPromptAndNoEcho) {
+  ToolOptions options = Login();
+  options.arguments = Joined(options.arguments, {"--password-fd", "7"});
+  options.prepare = [] { dup2(open("/dev/tty", O_RDONLY | O_NOCTTY), 7); };
+  ToolProcess tool(options);
+  // Nothing is shown when it begins to read.
+  const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
+  while (tool.IsEchoing() && std::chrono::steady_clock::now() < end) {
+    ASSERT_FALSE(tool.WaitFor(kPrompt, std::chrono::milliseconds(1)));
+  }
+  ASSERT_FALSE(tool.IsEchoing());
+  tool.Type("secret\n");
+  const ToolResult result = tool.Finish();
+  EXPECT_EQ(result.status, 0) << result.terminal;
+  EXPECT_THAT(result.terminal, Not(HasSubstr("secret")));
+  EXPECT_THAT(result.terminal, Not(HasSubstr(kPrompt)));
+}
+
+TEST_F(TerminalTest, ALongLineIsNotKept) {
+  ToolProcess tool(Login());
+  ASSERT_TRUE(tool.WaitFor(kPrompt));
+  // Ctrl-D passes on what has been typed without ending the line.
+  tool.Type(std::string(600, 'a') + "\x04");
+  tool.Type(std::string(600, 'a') + "\x04");
+  const ToolResult result = tool.Finish();
+  EXPECT_EQ(result.status, 4);
+  EXPECT_THAT(result.terminal, HasSubstr("longer than 1024 bytes"));
 }
 
 TEST_F(TerminalTest, ASignalRestoresTheTerminalAndEndsTheProcess) {
@@ -85,7 +130,8 @@ TEST_F(TerminalTest, OtherProcessesDoNotSeeThePassword) {
   const std::string folder = "/proc/" + std::to_string(tool.Id());
   EXPECT_THAT(Content(folder + "/cmdline"), HasSubstr("alice"));
   EXPECT_THAT(Content(folder + "/cmdline"), Not(HasSubstr("secret")));
-  EXPECT_THAT(Content(folder + "/environ"), HasSubstr("TERM=xterm"));
+  // Others than root cannot even read it.
+  EXPECT_THAT(Content(folder + "/environ"), HasSubstr(geteuid() == 0 ? "TERM=xterm" : ""));
   EXPECT_THAT(Content(folder + "/environ"), Not(HasSubstr("secret")));
 }
 

@@ -1,10 +1,12 @@
 #include <set>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 #include <openssl/evp.h>
+#include <unistd.h>
 
 #include "support/token_files.h"
 
@@ -291,6 +293,22 @@ TEST_F(VerifyTest, ASignatureProvesTheKeyToo) {
   Arguments bad = proof;
   bad.insert(bad.end(), {"--proof-data", files.Write("other.data", "another challenge")});
   ExpectRefused(BoundText(), bad, "wrong-proof", "possession");
+}
+
+TEST_F(VerifyTest, AProofHasALimit) {
+  const std::string small = files.Write("small", "octets");
+  const std::string large = files.Write("large", "");
+  constexpr off_t kLimit = off_t{16} * 1024 * 1024;
+  for (const auto& [data, signature] : {std::pair(large, small), std::pair(small, large)}) {
+    const Arguments proof{"--proof-data", data, "--proof-signature", signature, "--json"};
+    ASSERT_EQ(truncate(large.c_str(), kLimit), 0);
+    EXPECT_EQ(VerifyForAudience(BoundText(), proof).Json().at("reason"), "wrong-proof");
+    ASSERT_EQ(truncate(large.c_str(), kLimit + 1), 0);
+    const ToolResult result = VerifyForAudience(BoundText(), proof);
+    EXPECT_EQ(result.status, 4);
+    ASSERT_TRUE(result.Json().contains("error")) << result.out;
+    EXPECT_EQ(result.Json().at("error").at("kind"), "proof-file");
+  }
 }
 
 TEST_F(VerifyTest, HasLimits) {

@@ -30,6 +30,15 @@ TEST(SecretTextTest, WhatIsRemovedIsOverwritten) {
   EXPECT_EQ(std::string(place + 6, 12), std::string(12, '\0'));
 }
 
+TEST(SecretTextTest, TrimmingLeavesNoPartOfTheText) {
+  SecretText text = Make("   a secret \n");
+  const char* const place = text.Text().data();
+  text.Trim();
+  EXPECT_EQ(text.Text(), "a secret");
+  EXPECT_EQ(text.Text().data(), place);
+  EXPECT_EQ(std::string(place + 8, 5), std::string(5, '\0'));
+}
+
 TEST(SecretTextTest, GrowsAndKeepsItsContent) {
   const std::string large(100'000, 'x');
   SecretText text = Make("a");

@@ -1,4 +1,5 @@
 // The forms in which the key of a login can be.
+#include <map>
 #include <string>
 #include <vector>
 
@@ -89,6 +90,48 @@ TEST_F(KeyOptionsTest, APassphraseFileOfOthersIsRefused) {
     EXPECT_EQ(result.status, 4);
     EXPECT_THAT(result.out, HasSubstr("\"passphrase-file-open\""));
   }
+}
+
+TEST_F(KeyOptionsTest, AKeyCanComeFromAPipe) {
+  ToolOptions options;
+  options.arguments = Command("login", {"--json", "-o", PathOf("token"), "--certificate",
+                                        "/dev/fd/7", "--passphrase-file", PathOf("passphrase")});
+  options.descriptors[7] = Content(PathOf("both.pem"));
+  const ToolResult both = RunTool(options);
+  EXPECT_EQ(both.status, 0) << both.out;
+
+  options.arguments = Joined(options.arguments, {"--key", "/dev/fd/8"});
+  options.descriptors = {{7, TheIdentity().Pem()}, {8, Content(PathOf("robot.key"))}};
+  const ToolResult pair = RunTool(options);
+  EXPECT_EQ(pair.status, 0) << pair.out;
+}
+
+// A URI must not be a way around the check of the file.
+TEST_F(KeyOptionsTest, AFileIsNamedByItsPath) {
+  for (const std::string scheme : {"file:", "file://", "FILE:", "file://localhost"}) {
+    for (const std::string command : {"login", "doctor"}) {
+      const ToolResult result = Run(
+          command, {"--certificate", PathOf("robot.pem"), "--key", scheme + PathOf("robot.key")},
+          "passphrase");
+      EXPECT_EQ(result.status, 2) << result.out;
+      EXPECT_EQ(result.Json()["error"]["kind"], "usage");
+      EXPECT_THAT(result.out, HasSubstr("--key: name a file by its path"));
+    }
+  }
+}
+
+TEST_F(KeyOptionsTest, AKeyFileThatOthersCanUseIsRefused) {
+  const auto login = Joined(Forms()[1], {"-o", PathOf("token")});
+  for (const mode_t mode : {0640U, 0620U, 0604U, 0602U}) {
+    chmod(PathOf("robot.key").c_str(), mode);
+    const ToolResult result = Run("login", login, "passphrase");
+    EXPECT_EQ(result.status, 4) << mode;
+    EXPECT_EQ(result.Json()["error"]["kind"], "key-file-open");
+    EXPECT_EQ(Run("login", Joined(login, {"--allow-open-files"}), "passphrase").status, 0);
+  }
+  chmod(PathOf("robot.pem").c_str(), 0644);  // certificates are public
+  chmod(PathOf("robot.key").c_str(), 0400);
+  EXPECT_EQ(Run("login", login, "passphrase").status, 0);
 }
 
 TEST_F(KeyOptionsTest, DoctorLogsInWithWhatLoginAccepts) {
