@@ -40,7 +40,7 @@ std::string FolderOf(const std::string& path) {
 // Reads the lines one after another. Every function throws std::invalid_argument.
 class Reader {
  public:
-  explicit Reader(std::string path) : folder_(FolderOf(path)) {}
+  explicit Reader(const std::string& path) : folder_(FolderOf(path)) {}
 
   void Take(const std::string& line, unsigned number) {
     number_ = number;

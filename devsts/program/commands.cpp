@@ -69,7 +69,8 @@ const std::vector<Commands::Command>& Commands::All() {
   return commands;
 }
 
-Commands::Commands(Server& server, Users users, AssertionOptions assertion, Revocations revocations)
+Commands::Commands(Server& server, Users users, const AssertionOptions& assertion,
+                   Revocations revocations)
     : server_(server),
       signingKey_(assertion.signingKey),
       users_(std::move(users)),

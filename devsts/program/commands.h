@@ -20,7 +20,7 @@ class Commands {
   };
 
   // `users` and `assertion` are those of the server.
-  Commands(Server& server, Users users, AssertionOptions assertion, Revocations revocations);
+  Commands(Server& server, Users users, const AssertionOptions& assertion, Revocations revocations);
 
   Answer Execute(const std::string& line);
   // Ends the commands that wait.

@@ -10,6 +10,7 @@
 #include <unistd.h>
 
 #include "errors.h"
+#include "wire/accept.h"
 
 namespace DevSts::Program {
 namespace {
@@ -99,10 +100,12 @@ ControlSocket::~ControlSocket() {
   }
 }
 
-void ControlSocket::Start(Commands& commands, std::function<void()> quit) {
+void ControlSocket::Start(Commands& commands, std::function<void()> quit,
+                          std::function<void(const std::string& message)> failed) {
   commands_ = &commands;
   quit_ = std::move(quit);
-  acceptor_ = std::thread([this] { AcceptUntilStopped(); });
+  failed_ = std::move(failed);
+  acceptor_ = std::thread([this] { Accept(); });
 }
 
 void ControlSocket::Stop() {
@@ -110,6 +113,7 @@ void ControlSocket::Stop() {
     return;
   }
   commands_->Stop();
+  acceptsNoMore_ = true;
   shutdown(listener_.Get(), SHUT_RDWR);  // ends accept() in the thread
   acceptor_.join();
   std::map<std::uint64_t, Client> clients;
@@ -126,14 +130,11 @@ void ControlSocket::Stop() {
   }
 }
 
-void ControlSocket::AcceptUntilStopped() {
-  for (;;) {
-    const int accepted = accept4(listener_.Get(), nullptr, nullptr, SOCK_CLOEXEC);
-    if (accepted >= 0) {
-      Take(Descriptor(accepted));
-    } else if (errno != EINTR && errno != ECONNABORTED && errno != EMFILE && errno != ENFILE) {
-      return;
-    }
+void ControlSocket::Accept() {
+  const int error = AcceptUntilStopped(listener_.Get(), acceptsNoMore_,
+                                       [this](int accepted) { Take(Descriptor(accepted)); });
+  if (error != 0) {
+    failed_(path_ + ": accepts no more connections: " + std::strerror(error));
   }
 }
 

@@ -1,6 +1,7 @@
 #ifndef DEVSTS_PROGRAM_CONTROL_SOCKET_H
 #define DEVSTS_PROGRAM_CONTROL_SOCKET_H
 
+#include <atomic>
 #include <cstdint>
 #include <functional>
 #include <map>
@@ -33,8 +34,10 @@ class ControlSocket {
   ControlSocket& operator=(const ControlSocket&) = delete;
 
   // Serves clients on threads of its own until `Stop`, after which it no longer uses `commands`.
-  // `quit` is called after the answer to a command that ends the service.
-  void Start(Commands& commands, std::function<void()> quit);
+  // `quit` is called after the answer to a command that ends the service, and `failed` if the
+  // socket can accept no more clients; neither may throw.
+  void Start(Commands& commands, std::function<void()> quit,
+             std::function<void(const std::string& message)> failed);
   void Stop();
 
  private:
@@ -43,7 +46,7 @@ class ControlSocket {
     std::thread thread;
   };
 
-  void AcceptUntilStopped();
+  void Accept();
   void Take(Descriptor socket);
   void Serve(int socket);
   // Executes the complete lines and removes them from the text. Returns false after "quit".
@@ -55,6 +58,8 @@ class ControlSocket {
   ino_t inode_ = 0;
   Commands* commands_ = nullptr;
   std::function<void()> quit_;
+  std::function<void(const std::string&)> failed_;
+  std::atomic<bool> acceptsNoMore_ = false;
   std::thread acceptor_;
   std::mutex mutex_;  // of the members below
   bool stopped_ = false;

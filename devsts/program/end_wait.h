@@ -1,29 +1,34 @@
 #ifndef DEVSTS_PROGRAM_END_WAIT_H
 #define DEVSTS_PROGRAM_END_WAIT_H
 
-#include <functional>
+#include <mutex>
 #include <string>
 
+#include "event.h"
 #include "files.h"
 
 namespace DevSts::Program {
 
-// Waits until the service is asked to end. Must be constructed before any other thread runs, since
-// it blocks SIGTERM and SIGINT, which it receives from then on.
+// Waits until the service has to end. Must be constructed before any other thread runs, since it
+// blocks SIGTERM and SIGINT, which it receives from then on.
 class EndWait {
  public:
+  // Throws ProgramError.
   EndWait();
 
   // Asks for the end; from any thread.
   void Request();
+  // Asks for the end because of an error; from any thread.
+  void Fail(const std::string& message);
 
-  // Returns after a signal or `Request`; with standard input, also when it ends or `execute`, which
-  // is called with each of its lines, returns false.
-  void Wait(bool withStdin, const std::function<bool(const std::string& line)>& execute);
+  // Returns after a signal or `Request`. Throws ProgramError with the first message after `Fail`.
+  void Wait();
 
  private:
   Descriptor signals_;
-  Descriptor requested_;
+  Event requested_;
+  std::mutex mutex_;
+  std::string failure_;
 };
 
 }  // namespace DevSts::Program

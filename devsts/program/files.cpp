@@ -19,13 +19,15 @@ namespace {
 constexpr std::size_t kMaxSize = std::size_t{4} << 20U;
 
 [[noreturn]] void ThrowFor(const std::string& path, const std::string& what, int error) {
-  throw FileError(path + ": " + what + ": " + std::strerror(error));
+  throw FileError(path + ": " + what + ": " +
+                  (error == ELOOP ? "symbolic links are not followed here" : std::strerror(error)));
 }
 
-}  // namespace
+mode_t ModeFor(Readers readers) {
+  return readers == Readers::OwnerOnly ? 0600 : 0644;
+}
 
-std::string ReadWhole(const std::string& path) {
-  const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC));
+std::string ReadAll(const Descriptor& file, const std::string& path) {
   if (file.Get() < 0) {
     ThrowFor(path, "cannot be read", errno);
   }
@@ -46,11 +48,39 @@ std::string ReadWhole(const std::string& path) {
   }
 }
 
+}  // namespace
+
+std::string ReadWhole(const std::string& path) {
+  return ReadAll(Descriptor(open(path.c_str(), O_RDONLY | O_CLOEXEC)), path);
+}
+
+std::string ReadOwnWhole(const std::string& path, Readers readers) {
+  const Descriptor file(open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+  struct stat found {};
+  if (file.Get() >= 0 && fstat(file.Get(), &found) == 0) {
+    if (!S_ISREG(found.st_mode)) {
+      throw FileError(path + ": this is not a regular file");
+    }
+    if (readers == Readers::OwnerOnly && (found.st_mode & (S_IRWXG | S_IRWXO)) != 0) {
+      throw FileError(path + ": others have access to the key; run chmod 600 on it");
+    }
+  }
+  return ReadAll(file, path);
+}
+
+Descriptor OpenOwn(const std::string& path, int flags, Readers readers) {
+  Descriptor file(
+      open(path.c_str(), flags | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC, ModeFor(readers)));
+  if (file.Get() < 0) {
+    ThrowFor(path, "cannot be written", errno);
+  }
+  return file;
+}
+
 void WriteWhole(const std::string& path, const std::string& text, Readers readers) {
   std::string pattern = path + ".XXXXXX";
   Descriptor file(mkostemp(pattern.data(), O_CLOEXEC));
-  const mode_t mode = readers == Readers::OwnerOnly ? 0600 : 0644;
-  bool done = file.Get() >= 0 && fchmod(file.Get(), mode) == 0;
+  bool done = file.Get() >= 0 && fchmod(file.Get(), ModeFor(readers)) == 0;
   for (std::size_t at = 0; done && at < text.size();) {
     const ssize_t size = write(file.Get(), text.data() + at, text.size() - at);
     done = size > 0;

@@ -7,12 +7,35 @@
 
 namespace DevSts::Program {
 
+// A file descriptor that the destructor closes.
+class Descriptor {
+ public:
+  Descriptor() = default;
+  explicit Descriptor(int number) : number_(number) {}
+  ~Descriptor();
+  Descriptor(Descriptor&& other) noexcept;
+  Descriptor& operator=(Descriptor&& other) noexcept;
+
+  int Get() const { return number_; }
+
+ private:
+  int number_ = -1;
+};
+
+enum class Readers { Everybody, OwnerOnly };
+
 // Each function throws FileError with the path and the system's reason.
 
 // The content of a file of at most a few megabytes.
 std::string ReadWhole(const std::string& path);
+// The same for a file of a folder that the program itself has made. Others must not be able to
+// replace it by a link, so symbolic links and files that are not regular are refused; for
+// `OwnerOnly`, also files that others can access.
+std::string ReadOwnWhole(const std::string& path, Readers readers = Readers::Everybody);
 
-enum class Readers { Everybody, OwnerOnly };
+// Opens a file to which the program writes, which is made if it does not exist, with these flags of
+// open(). Symbolic links are refused, which could lead to a file that the user has not named.
+Descriptor OpenOwn(const std::string& path, int flags, Readers readers = Readers::Everybody);
 
 // Replaces the file as a whole: readers see the old content or the new one, never a part.
 void WriteWhole(const std::string& path, const std::string& text,
@@ -32,21 +55,6 @@ class TemporaryFile {
  private:
   std::string path_;
   std::string text_;
-};
-
-// A file descriptor that the destructor closes.
-class Descriptor {
- public:
-  Descriptor() = default;
-  explicit Descriptor(int number) : number_(number) {}
-  ~Descriptor();
-  Descriptor(Descriptor&& other) noexcept;
-  Descriptor& operator=(Descriptor&& other) noexcept;
-
-  int Get() const { return number_; }
-
- private:
-  int number_ = -1;
 };
 
 // Writes everything, and ignores errors of a reader that has gone.

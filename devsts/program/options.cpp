@@ -132,8 +132,8 @@ void AddRunning(CLI::App& app, Options& options) {
   auto* quiet = app.add_flag("--quiet", options.isQuiet, "Prints no line for each request")
                     ->option_text(" ")
                     ->group(kGroup);
-  AddText(app, "--log", options.logFile, "FILE", "Appends the lines of requests to this file",
-          kGroup)
+  AddText(app, "--log", options.logFile, "FILE",
+          "Appends the lines of requests to this file, which is no symbolic link", kGroup)
       ->excludes(quiet);
 }
 

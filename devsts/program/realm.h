@@ -18,7 +18,7 @@ class StartedRealm {
 
   // The keytab of the service.
   const std::string& Keytab() const { return keytab_; }
-  // The lines that tell clients how to log in.
+  // The lines that a client needs to log in.
   std::string Lines() const;
 
  private:

@@ -39,13 +39,6 @@ std::string Printable(std::string text) {
 
 }  // namespace
 
-void LineOutput::Write(const std::string& line) {
-  const std::lock_guard lock(mutex_);
-  if (descriptor_ >= 0) {
-    WriteToDescriptor(descriptor_, line + "\n");
-  }
-}
-
 std::string DescribeRequest(const ReceivedRequest& request) {
   constexpr std::array<const char*, 4> kSignatures{"none", "certificate", "token", "other"};
   std::string text = "connection=" + std::to_string(request.connectionId) +

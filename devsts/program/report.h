@@ -1,26 +1,12 @@
 #ifndef DEVSTS_PROGRAM_REPORT_H
 #define DEVSTS_PROGRAM_REPORT_H
 
-#include <mutex>
+#include <cstdint>
 #include <string>
 
 #include "devsts/server.h"
-#include "files.h"
 
 namespace DevSts::Program {
-
-// Lines of text for a file descriptor; one at a time, from any thread.
-class LineOutput {
- public:
-  // `descriptor` is not closed; -1 discards the lines.
-  explicit LineOutput(int descriptor) : descriptor_(descriptor) {}
-
-  void Write(const std::string& line);
-
- private:
-  std::mutex mutex_;
-  const int descriptor_;
-};
 
 // The properties of a request as NAME=VALUE, without its body, which contains passwords.
 std::string DescribeRequest(const ReceivedRequest& request);

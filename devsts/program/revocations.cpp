@@ -19,7 +19,7 @@ Revocations::Revocations(Keys keys, const std::string& stateFolder) : keys_(std:
   if (stateFolder.empty() || !Exists(path)) {
     return;
   }
-  const std::string list = ReadWhole(path);
+  const std::string list = ReadOwnWhole(path);
   try {
     for (const char* name : {"signing", "server", "client"}) {
       if (IsRevokedBy(list, CertificateOf(name), keys_.authority.certificatePem)) {

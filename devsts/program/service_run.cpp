@@ -16,8 +16,9 @@
 #include "end_wait.h"
 #include "errors.h"
 #include "files.h"
-#include "help_texts.h"
+#include "input_commands.h"
 #include "keys.h"
+#include "line_output.h"
 #include "realm.h"
 #include "report.h"
 #include "revocations.h"
@@ -66,7 +67,6 @@ KeyPlan PlanOf(const Options& options) {
 }
 
 void WriteOut(const std::string& folder, const Keys& keys) {
-  MakeFolder(folder);
   WriteWhole(folder + "/ca.pem", keys.authority.certificatePem);
   WriteWhole(folder + "/signing.pem", keys.signing.certificatePem);
   WriteWhole(folder + "/client.pem", keys.client.certificatePem);
@@ -92,17 +92,6 @@ Users UsersOf(const AccountsFile& accounts, const Keys& keys) {
   return users;
 }
 
-Descriptor OpenLog(const std::string& path) {
-  if (path.empty()) {
-    return {};
-  }
-  Descriptor log(open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0644));
-  if (log.Get() < 0) {
-    throw FileError(path + ": cannot be written");
-  }
-  return log;
-}
-
 std::unique_ptr<Server> StartServer(ServerOptions options) {
   if (!options.negotiation.keytab.empty() &&
       access(options.negotiation.keytab.c_str(), R_OK) != 0) {
@@ -125,22 +114,13 @@ std::string ReadyLines(const Server& server, const StartedRealm* realm) {
          (realm != nullptr ? realm->Lines() : "");
 }
 
-// Everything that the service consists of, in the order in which it is made.
+// Everything that the service consists of.
 class Service {
  public:
-  explicit Service(Options options)
-      : options_(std::move(options)),
-        log_(OpenLog(options_.logFile)),
-        requestLines_(options_.isQuiet           ? -1
-                      : options_.logFile.empty() ? STDOUT_FILENO
-                                                 : log_.Get()) {
+  explicit Service(Options options) : options_(std::move(options)) {
     const AccountsFile accounts = AccountsOf(options_);
-    if (!options_.stateFolder.empty()) {
-      state_.emplace(options_.stateFolder);
-    }
-    if (!options_.controlPath.empty()) {
-      control_.emplace(options_.controlPath);
-    }
+    MakeFolders();
+    OpenFiles();
     const Keys keys = state_ ? state_->LoadOrMake(PlanOf(options_)) : MakeKeys(PlanOf(options_));
     if (!options_.outFolder.empty()) {
       WriteOut(options_.outFolder, keys);
@@ -152,8 +132,14 @@ class Service {
     Serve(accounts, keys, std::move(revocations));
   }
   ~Service() {
+    // Before the commands are destroyed.
+    if (commands_) {
+      commands_->Stop();
+    }
+    output_.EndWaits();
+    input_.reset();
     if (control_) {
-      control_->Stop();  // before the commands are destroyed
+      control_->Stop();
     }
   }
   Service(const Service&) = delete;
@@ -162,7 +148,9 @@ class Service {
   // Accepts commands, and says that the service is ready.
   void Announce(const std::function<void()>& ready) {
     if (control_) {
-      control_->Start(*commands_, [this] { end_.Request(); });
+      control_->Start(
+          *commands_, [this] { end_.Request(); },
+          [this](const std::string& message) { end_.Fail(message); });
     }
     const std::string lines = ReadyLines(*server_, realm_ ? &*realm_ : nullptr);
     if (!options_.pidFile.empty()) {
@@ -173,18 +161,46 @@ class Service {
     }
     WriteToDescriptor(STDOUT_FILENO, lines + "ready\n");
     ready();
+    output_.Start();
+    if (log_) {
+      log_->Start();
+    }
+    if (options_.endsWithStdin) {
+      input_.emplace([this](const std::string& line) { return Execute(line); },
+                     [this] { end_.Request(); });
+    }
   }
 
-  void WaitForEnd() {
-    LineOutput answers(STDOUT_FILENO);
-    end_.Wait(options_.endsWithStdin, [&](const std::string& line) {
-      const Commands::Answer answer = commands_->Execute(line);
-      answers.Write(answer.line);
-      return !answer.quits;
-    });
-  }
+  void WaitForEnd() { end_.Wait(); }
 
  private:
+  void MakeFolders() {
+    if (!options_.stateFolder.empty()) {
+      state_.emplace(options_.stateFolder);
+    }
+    if (!options_.outFolder.empty()) {
+      MakeFolder(options_.outFolder);
+    }
+  }
+
+  // They may be in the folders.
+  void OpenFiles() {
+    if (!options_.controlPath.empty()) {
+      control_.emplace(options_.controlPath);
+    }
+    if (!options_.logFile.empty()) {
+      logFile_ = OpenOwn(options_.logFile, O_WRONLY | O_APPEND);
+      log_.emplace(logFile_.Get());
+    }
+  }
+
+  // Returns false after "quit".
+  bool Execute(const std::string& line) {
+    const Commands::Answer answer = commands_->Execute(line);
+    output_.WriteEach(answer.line);
+    return !answer.quits;
+  }
+
   void Serve(const AccountsFile& accounts, const Keys& keys, Revocations revocations) {
     ServerOptions serverOptions = options_.server;
     serverOptions.users = UsersOf(accounts, keys);
@@ -193,9 +209,12 @@ class Service {
     // The principals of the options take precedence.
     serverOptions.negotiation.principals.insert(accounts.principals.begin(),
                                                 accounts.principals.end());
-    serverOptions.onRequest = [this](const ReceivedRequest& request) {
-      requestLines_.Write("request " + DescribeRequest(request));
-    };
+    if (!options_.isQuiet) {
+      serverOptions.onRequest = [&lines = log_ ? *log_ : output_](const ReceivedRequest& request) {
+        lines.Write("request " + DescribeRequest(request));
+      };
+    }
+    serverOptions.onFailure = [this](const std::string& message) { end_.Fail(message); };
     const Users users = serverOptions.users;
     server_ = StartServer(std::move(serverOptions));
     server_->SetNegotiationScript(options_.negotiation);
@@ -205,10 +224,12 @@ class Service {
     commands_.emplace(*server_, users, options_.server.assertion, std::move(revocations));
   }
 
+  // In the order in which they are made.
   const Options options_;
   EndWait end_;
-  Descriptor log_;
-  LineOutput requestLines_;
+  LineOutput output_{STDOUT_FILENO};
+  Descriptor logFile_;
+  std::optional<LineOutput> log_;
   std::optional<StateFolder> state_;
   std::optional<ControlSocket> control_;
   std::optional<StartedRealm> realm_;
@@ -216,6 +237,7 @@ class Service {
   std::optional<Commands> commands_;
   std::optional<TemporaryFile> pidFile_;
   std::optional<TemporaryFile> readyFile_;
+  std::optional<InputCommands> input_;
 };
 
 }  // namespace

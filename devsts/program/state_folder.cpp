@@ -1,13 +1,10 @@
 #include "state_folder.h"
 
 #include <array>
-#include <cerrno>
-#include <cstring>
 #include <utility>
 
 #include <fcntl.h>
 #include <sys/file.h>
-#include <sys/stat.h>
 
 #include "errors.h"
 
@@ -28,23 +25,11 @@ constexpr std::array<Entry, 4> kEntries{{
 }};
 
 Descriptor LockFolder(const std::string& path) {
-  const std::string file = path + "/lock";
-  Descriptor lock(open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
-  if (lock.Get() < 0) {
-    throw FileError(file + ": cannot be opened: " + std::strerror(errno));
-  }
+  Descriptor lock = OpenOwn(path + "/lock", O_RDWR, Readers::OwnerOnly);
   if (flock(lock.Get(), LOCK_EX | LOCK_NB) != 0) {
     throw FileError(path + ": another process uses this folder");
   }
   return lock;
-}
-
-std::string ReadKeyFile(const std::string& path) {
-  struct stat found {};
-  if (stat(path.c_str(), &found) == 0 && (found.st_mode & (S_IRWXG | S_IRWXO)) != 0) {
-    throw FileError(path + ": others have access to the key; run chmod 600 on it");
-  }
-  return ReadWhole(path);
 }
 
 }  // namespace
@@ -80,7 +65,7 @@ Keys StateFolder::Load(const KeyPlan& plan) const {
         throw FileError(file + ": the file is missing; remove the folder to make new keys");
       }
     }
-    keys.*member = {ReadWhole(certificate), ReadKeyFile(key)};
+    keys.*member = {ReadOwnWhole(certificate), ReadOwnWhole(key, Readers::OwnerOnly)};
   }
   try {
     CheckKeys(keys, plan);

@@ -1,5 +1,6 @@
 #include "devsts/server.h"
 
+#include <iostream>
 #include <memory>
 #include <mutex>
 #include <stdexcept>
@@ -88,10 +89,13 @@ class Server::Impl {
         tls(MakeTlsIdentity(options.tls, options.keys, authority)),
         service(options, signing),
         observation(options.requestLogLimit),
-        httpListener(options.address, options.httpPort,
-                     [this](int socket) { Take(socket, nullptr); }),
-        httpsListener(options.address, options.httpsPort,
-                      [this](int socket) { Take(socket, Tls().context.get()); }) {}
+        httpListener(
+            options.address, options.httpPort, [this](int socket) { Take(socket, nullptr); },
+            [this](const std::string& message) { Report(message); }),
+        httpsListener(
+            options.address, options.httpsPort,
+            [this](int socket) { Take(socket, Tls().context.get()); },
+            [this](const std::string& message) { Report(message); }) {}
 
   ~Impl() { threads.Stop(); }
 
@@ -117,10 +121,14 @@ class Server::Impl {
     const auto serve = [this](Connection& connection, std::uint64_t id) {
       Conversation(connection, id, {service, plan, observation, options.onRequest}).Run();
     };
-    try {
-      threads.Start(socket, context, serve, closed);
-    } catch (const std::runtime_error&) {
-      closed();  // no thread could be started, and the peer's connection is closed
+    threads.Start(socket, context, serve, closed);
+  }
+
+  void Report(const std::string& failure) const {
+    if (options.onFailure) {
+      options.onFailure(failure);
+    } else {
+      std::cerr << "dev STS: " + failure + "\n";
     }
   }
 

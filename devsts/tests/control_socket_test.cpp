@@ -1,6 +1,8 @@
 #include "control_socket.h"
 
 #include <atomic>
+#include <cerrno>
+#include <chrono>
 #include <memory>
 #include <string>
 #include <thread>
@@ -13,6 +15,7 @@
 #include "devsts/server.h"
 #include "errors.h"
 #include "program_process.h"
+#include "replaced_calls.h"
 
 namespace DevSts::Testing {
 namespace {
@@ -59,7 +62,8 @@ class ControlSocketTest : public testing::Test {
  protected:
   void Start() {
     control = std::make_unique<ControlSocket>(path);
-    control->Start(commands, [this] { ++quits; });
+    control->Start(
+        commands, [this] { ++quits; }, [this](const std::string&) { ++failures; });
   }
 
   ScratchFolder scratch;
@@ -67,6 +71,7 @@ class ControlSocketTest : public testing::Test {
   Server server;
   Commands commands{server, DemoUsers(), AssertionOptions(), Program::Revocations({}, "")};
   std::atomic<int> quits = 0;
+  std::atomic<int> failures = 0;
   std::unique_ptr<ControlSocket> control;
 };
 
@@ -132,6 +137,23 @@ TEST_F(ControlSocketTest, RefusesTooManyClientsUntilSomeEnd) {
   clients.back()->EndSending();
   EXPECT_EQ(clients.back()->ReadLine(), "");  // the service has ended it
   EXPECT_EQ(Client(path).Ask("requests"), "ok requests=0");
+}
+
+TEST_F(ControlSocketTest, AShortageDoesNotEndIt) {
+  const AcceptErrors errors(AF_UNIX, {EMFILE, ENFILE, ENOMEM, ECONNABORTED, EPROTO});
+  Start();
+  EXPECT_EQ(Client(path).Ask("requests"), "ok requests=0");
+  EXPECT_EQ(failures, 0);
+  const auto times = AcceptErrors::AwaitTimes();
+  EXPECT_GE(times.at(1) - times.at(0), std::chrono::milliseconds(20)) << "it pauses";
+}
+
+TEST_F(ControlSocketTest, ReportsThatItCanAcceptNoMore) {
+  const AcceptErrors errors(AF_UNIX, {EINVAL});
+  Start();
+  AcceptErrors::AwaitTimes();
+  control.reset();
+  EXPECT_EQ(failures, 1);
 }
 
 TEST_F(ControlSocketTest, QuitsAfterTheAnswer) {

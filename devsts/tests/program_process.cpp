@@ -180,6 +180,10 @@ int ProgramProcess::WaitForEnd() {
   }
   while (ReadMore(errorPipe_, errors_)) {
   }
+  return WaitForEndOnly();
+}
+
+int ProgramProcess::WaitForEndOnly() {
   int status = 0;
   while (::waitpid(process_, &status, 0) < 0 && errno == EINTR) {
   }

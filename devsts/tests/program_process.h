@@ -52,6 +52,8 @@ class ProgramProcess {
   void Signal(int number) const;
   // Reads both outputs to their ends, and returns the exit status.
   int WaitForEnd();
+  // The same without reading.
+  int WaitForEndOnly();
 
   const std::string& Output() const { return output_; }
   const std::string& Errors() const { return errors_; }

@@ -1,15 +1,21 @@
+#include <chrono>
 #include <string>
 #include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <netinet/in.h>
 #include <openssl/x509_vfy.h>
 #include <poll.h>
 #include <signal.h>
+#include <sys/resource.h>
+#include <sys/socket.h>
 #include <sys/syscall.h>
+#include <time.h>
 #include <unistd.h>
 
 #include "devsts/xml_security.h"
+#include "files.h"
 #include "help_texts.h"
 #include "program_process.h"
 #include "raw_client.h"
@@ -18,6 +24,7 @@
 namespace DevSts::Testing {
 namespace {
 
+using Program::Descriptor;
 using testing::AllOf;
 using testing::HasSubstr;
 using testing::Not;
@@ -66,6 +73,97 @@ TEST(ProgramTest, ExecutesCommandsFromStandardInputUntilItEnds) {
   EXPECT_EQ(program.ReadLine(), "ok resumed");
   program.CloseInput();
   EXPECT_EQ(program.WaitForEnd(), 0);
+}
+
+TEST(ProgramTest, EndsOnSignalsWhileACommandWaits) {
+  for (const int signal : {SIGTERM, SIGINT}) {
+    ProgramProcess program({"--end-with-stdin"});
+    program.AwaitReady();
+    program.SendInput("requests\nwait requests 1 1h\n");
+    EXPECT_EQ(program.ReadLine(), "ok requests=0");
+    program.Signal(signal);
+    EXPECT_EQ(program.WaitForEnd(), 0);
+    EXPECT_THAT(program.Output(), HasSubstr("\nerror not reached: "));
+  }
+}
+
+TEST(ProgramTest, ServesAndEndsAlthoughNobodyReadsItsOutput) {
+  ProgramProcess program({"--end-with-stdin"});
+  program.AwaitReady();
+  const std::uint16_t port = PortIn(program.Value("http_url"));
+  const std::string request = PostOf("not XML", std::string(6000, 'x'));
+  constexpr int kRequests = 30;  // whose lines do not fit into the pipe
+  for (int i = 0; i < kRequests; ++i) {
+    RawClient client(port);
+    client.Send(request);
+    ASSERT_THAT(client.ReadAnswer(), StartsWith("HTTP/1.1 500 ")) << i;
+  }
+  program.SendInput("requests\n");
+  for (int i = 0; i < kRequests; ++i) {
+    EXPECT_THAT(program.ReadLine(), StartsWith("request "));
+  }
+  EXPECT_EQ(program.ReadLine(), "ok requests=30");
+  for (int i = 0; i < kRequests; ++i) {
+    RawClient client(port);
+    client.Send(request);
+    client.ReadAnswer();
+  }
+  program.Signal(SIGTERM);
+  EXPECT_EQ(program.WaitForEndOnly(), 0);
+}
+
+TEST(ProgramTest, PausesAndRecoversWhenDescriptorsAreMissing) {
+  ProgramProcess program({});
+  program.AwaitReady();
+  const std::uint16_t port = PortIn(program.Value("http_url"));
+  rlimit limit{};
+  ASSERT_EQ(prlimit(program.Id(), RLIMIT_NOFILE, nullptr, &limit), 0);
+  const rlimit none{3, limit.rlim_max};
+  ASSERT_EQ(prlimit(program.Id(), RLIMIT_NOFILE, &none, nullptr), 0);
+  const RawClient first(port);  // has its descriptor from the call that already waits
+  RawClient second(port);
+  second.Send(PostOf(AliceEnvelope(), kIssueAction));
+  clockid_t clock{};
+  ASSERT_EQ(clock_getcpuclockid(program.Id(), &clock), 0);
+  const auto milliseconds = [&] {
+    timespec time{};
+    EXPECT_EQ(clock_gettime(clock, &time), 0);
+    return time.tv_sec * 1000 + time.tv_nsec / 1'000'000;
+  };
+  const long before = milliseconds();
+  EXPECT_TRUE(second.IsSilent(std::chrono::milliseconds(200)));
+  EXPECT_LT(milliseconds() - before, 60);
+  ASSERT_EQ(prlimit(program.Id(), RLIMIT_NOFILE, &limit, nullptr), 0);
+  EXPECT_THAT(second.ReadAnswer(), StartsWith("HTTP/1.1 200 "));
+}
+
+// The descriptor of a listening socket of another process at this port.
+Descriptor ListenerOf(pid_t process, std::uint16_t port) {
+  const Descriptor handle(static_cast<int>(syscall(SYS_pidfd_open, process, 0)));
+  for (int number = 0; number < 64; ++number) {
+    Descriptor copy(static_cast<int>(syscall(SYS_pidfd_getfd, handle.Get(), number, 0)));
+    sockaddr_in address{};
+    socklen_t size = sizeof address;
+    if (getsockname(copy.Get(), reinterpret_cast<sockaddr*>(&address), &size) == 0 &&
+        address.sin_family == AF_INET && ntohs(address.sin_port) == port) {
+      return copy;
+    }
+  }
+  return {};
+}
+
+TEST(ProgramTest, EndsWithAMessageWhenAPortAcceptsNoMore) {
+  ProgramProcess program({});
+  program.AwaitReady();
+  const std::uint16_t port = PortIn(program.Value("https_url"));
+  const Descriptor listener = ListenerOf(program.Id(), port);
+  if (listener.Get() < 0) {
+    GTEST_SKIP() << "This system does not let a process use descriptors of its child";
+  }
+  ASSERT_EQ(shutdown(listener.Get(), SHUT_RDWR), 0);
+  EXPECT_EQ(program.WaitForEnd(), 1);
+  EXPECT_THAT(program.Errors(), HasSubstr("ssoclient-devsts: port " + std::to_string(port) +
+                                          " accepts no more connections: Invalid argument\n"));
 }
 
 TEST(ProgramTest, RunsInTheBackgroundUntilACommandEndsIt) {
@@ -145,6 +243,33 @@ TEST(ProgramTest, KeepsItsKeysInAFolderThatOneProcessUses) {
   const ProgramResult broken = RunProgram({"--state", state});
   EXPECT_EQ(broken.status, 4);
   EXPECT_THAT(broken.errors, HasSubstr("signing.pem"));
+}
+
+TEST(ProgramTest, PutsItsFilesIntoFoldersThatItMakes) {
+  for (const char* option : {"--state", "--out"}) {
+    const ScratchFolder scratch;
+    const std::string folder = scratch / "sts";
+    ProgramProcess program({option, folder, "--log", folder + "/log", "--control",
+                            folder + "/control", "--pid-file", folder + "/pid", "--ready-file",
+                            folder + "/ready"});
+    program.AwaitReady();
+    AskAt(program.Value("http_url"));
+    EXPECT_THAT(TextOfFile(folder + "/log"), StartsWith("request ")) << option;
+    EXPECT_EQ(Control(folder + "/control", {"requests"}), "0 requests=1\n");
+    program.Signal(SIGTERM);
+    EXPECT_EQ(program.WaitForEnd(), 0);
+  }
+}
+
+TEST(ProgramTest, WritesNoLogThroughALink) {
+  const ScratchFolder scratch;
+  WriteTextTo(scratch / "file", "text");
+  ASSERT_EQ(symlink((scratch / "file").c_str(), (scratch / "log").c_str()), 0);
+  const ProgramResult result = RunProgram({"--log", scratch / "log", "--end-with-stdin"});
+  EXPECT_EQ(result.status, 4);
+  EXPECT_THAT(result.errors, HasSubstr((scratch / "log") + ": cannot be written: symbolic links"));
+  const ProgramResult twin = RunProgram({"--log", scratch / "file", "--end-with-stdin"});
+  EXPECT_EQ(twin.status, 0) << twin.errors;
 }
 
 TEST(ProgramTest, ReadsUsersAndPrincipalsFromAFile) {

@@ -200,7 +200,7 @@ INSTANTIATE_TEST_SUITE_P(
         RuleCase{"NoBinarySecurityToken",
                  {{"<wsse:BinarySecurityToken ", "<!--"}, {"</wsse:BinarySecurityToken>", "-->"}},
                  "wsse:InvalidSecurity",
-                 "The signature refers to a BinarySecurityToken, but there is none"},
+                 "The signature refers to a BinarySecurityToken that is missing"},
         RuleCase{"NoReference",
                  {{"<wsse:Reference ", "<wsse:Embedded "}},
                  "wsse:InvalidSecurity",

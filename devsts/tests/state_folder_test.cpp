@@ -8,6 +8,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include "devsts/certificates.h"
 #include "errors.h"
@@ -107,6 +108,31 @@ TEST_F(StateFolderTest, RefusesBrokenFiles) {
     WriteTextTo(path, text);
   }
   EXPECT_EQ(Refusal(state), "accepted");
+}
+
+TEST_F(StateFolderTest, RefusesLinksInPlaceOfItsFiles) {
+  const Keys keys = Start(state, ByAuthority());
+  Revocations(keys, state).WriteTo(state);
+  for (const char* name : {"lock", "ca.pem", "server-key.pem"}) {
+    const std::string path = state + "/" + name;
+    const std::string moved = scratch / name;
+    ASSERT_EQ(std::rename(path.c_str(), moved.c_str()), 0);
+    ASSERT_EQ(symlink(moved.c_str(), path.c_str()), 0);
+    EXPECT_THAT(Refusal(state, ByAuthority()), HasSubstr(std::string(name) + ": cannot be "));
+    ASSERT_EQ(std::rename(moved.c_str(), path.c_str()), 0);
+    EXPECT_EQ(Refusal(state, ByAuthority()), "accepted");
+  }
+  ASSERT_EQ(std::rename((state + "/ca.crl").c_str(), (scratch / "ca.crl").c_str()), 0);
+  ASSERT_EQ(symlink((scratch / "ca.crl").c_str(), (state + "/ca.crl").c_str()), 0);
+  EXPECT_THROW(Revocations(keys, state), FileError);
+}
+
+TEST_F(StateFolderTest, RefusesFilesThatAreNotRegular) {
+  Start(state);
+  const std::string path = state + "/ca.pem";
+  ASSERT_EQ(std::remove(path.c_str()), 0);
+  ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
+  EXPECT_THAT(Refusal(state), HasSubstr("ca.pem: this is not a regular file"));
 }
 
 TEST_F(StateFolderTest, RefusesExpiredCertificates) {

@@ -12,7 +12,7 @@ function append(path,   line) {
   fits = folder == last_folder && size < 12
   count = 0
   while ((getline line < $0) > 0) {
-    if (line !~ /^ *(using [^=]*;|namespace [A-Za-z0-9_]* *=)/) continue
+    if (line !~ /^ *(using [^=]*;|namespace [A-Za-z0-9_]* *=)|^int main\(/) continue
     declared[++count] = line
     if (line in used) fits = 0
   }

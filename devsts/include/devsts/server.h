@@ -133,6 +133,9 @@ struct ServerOptions {
   /// Called once for each request, on the connection's thread, after the answer has been determined
   /// and before it is sent.
   std::function<void(const ReceivedRequest&)> onRequest;
+  /// Called on a thread of the service when a port can accept no more connections, with a message
+  /// that names it. Must not throw. Without this function, standard error receives the message.
+  std::function<void(const std::string& message)> onFailure;
   ServerKeys keys;
 };
 
@@ -200,7 +203,8 @@ struct Counters {
 };
 
 /// The service. It listens on one HTTP and one HTTPS port from construction to destruction and uses
-/// one thread for each connection, up to about 2,000 connections at once. All members are
+/// one thread for each connection, up to about 2,000 connections at once. Connections wait while
+/// the system has no file descriptor for them, and are closed if it has no thread. All members are
 /// thread-safe.
 class Server {
  public:

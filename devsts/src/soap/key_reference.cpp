@@ -51,7 +51,7 @@ std::string CertificateByReference(xmlNode* securityTokenReference, const Securi
   RequireValue(reference, "URI", std::string("#") + kCertificateId);
   RequireValue(reference, "ValueType", kX509Token);
   if (header.certificateToken == nullptr) {
-    ThrowInvalidSecurity("The signature refers to a BinarySecurityToken, but there is none");
+    ThrowInvalidSecurity("The signature refers to a BinarySecurityToken that is missing");
   }
   if (header.assertion != nullptr) {
     ThrowInvalidSecurity("An assertion is not expected together with a BinarySecurityToken");

@@ -44,7 +44,6 @@ Connection::Connection(int socket, SSL_CTX* tls) : socket_(socket) {
   }
   tls_.reset(SSL_new(tls));
   if (!tls_ || SSL_set_fd(tls_.get(), socket_) != 1) {
-    close(socket_);
     ThrowOpenSslError("TLS connection");
   }
   SSL_set_app_data(tls_.get(), this);

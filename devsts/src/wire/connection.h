@@ -20,7 +20,7 @@ class Connection {
   // Must be called once for each context that connections use.
   static void Prepare(SSL_CTX* tls);
 
-  // Takes ownership of the socket. `tls` may be null.
+  // Takes ownership of the socket, unless it throws std::exception. `tls` may be null.
   Connection(int socket, SSL_CTX* tls);
   ~Connection();
   Connection(const Connection&) = delete;

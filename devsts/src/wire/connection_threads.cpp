@@ -18,10 +18,9 @@ void BlockBrokenPipeSignal() {
   pthread_sigmask(SIG_BLOCK, &signals, nullptr);
 }
 
-using Serve = std::function<void(Connection&, std::uint64_t id)>;
-
 // If a test's hook throws, only its connection ends, not the process.
-void ServeQuietly(Connection& connection, std::uint64_t id, const Serve& serve) {
+void ServeQuietly(Connection& connection, std::uint64_t id,
+                  const std::function<void(Connection&, std::uint64_t id)>& serve) {
   try {
     serve(connection, id);
   } catch (const std::exception&) {
@@ -31,8 +30,7 @@ void ServeQuietly(Connection& connection, std::uint64_t id, const Serve& serve) 
 
 }  // namespace
 
-void ConnectionThreads::Start(int socket, SSL_CTX* tls,
-                              const std::function<void(Connection&, std::uint64_t id)>& serve,
+void ConnectionThreads::Start(int socket, SSL_CTX* tls, const Serve& serve,
                               const std::function<void()>& closed) {
   std::unique_lock lock(mutex_);
   if (stopped_) {
@@ -41,18 +39,39 @@ void ConnectionThreads::Start(int socket, SSL_CTX* tls,
     closed();
     return;
   }
-  const std::uint64_t id = ++lastId_;
-  auto made = std::make_unique<Connection>(socket, tls);
-  Connection& connection = *made;
-  // The new thread accesses the map only after this lock is released.
-  std::thread thread([this, id, &connection, serve, closed] {
-    BlockBrokenPipeSignal();
-    ServeQuietly(connection, id, serve);
-    Leave(id);
+  std::unique_ptr<Connection> made;
+  try {
+    made = std::make_unique<Connection>(socket, tls);
+  } catch (const std::exception&) {
+    close(socket);
+  }
+  if (!made || !StartThread(std::move(made), serve, closed)) {
+    lock.unlock();
     closed();
-  });
-  running_.emplace(id, Entry{std::move(made), std::move(thread)});
+    return;
+  }
   JoinFinished(lock);
+}
+
+bool ConnectionThreads::StartThread(std::unique_ptr<Connection> made, const Serve& serve,
+                                    const std::function<void()>& closed) {
+  Connection& connection = *made;
+  const std::uint64_t id = ++lastId_;
+  try {
+    Entry& entry = running_[id];
+    entry.connection = std::move(made);
+    // The new thread accesses the map only after the lock is released.
+    entry.thread = std::thread([this, id, &connection, serve, closed] {
+      BlockBrokenPipeSignal();
+      ServeQuietly(connection, id, serve);
+      Leave(id);
+      closed();
+    });
+    return true;
+  } catch (const std::exception&) {
+    running_.erase(id);
+    return false;
+  }
 }
 
 void ConnectionThreads::Leave(std::uint64_t id) {

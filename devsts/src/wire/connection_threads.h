@@ -22,11 +22,12 @@ class ConnectionThreads {
   ConnectionThreads(const ConnectionThreads&) = delete;
   ConnectionThreads& operator=(const ConnectionThreads&) = delete;
 
+  using Serve = std::function<void(Connection&, std::uint64_t id)>;
+
   // Runs `serve` with the connection on a new thread, then closes the connection and calls
-  // `closed`. After `Stop`, closes the socket at once and calls `closed`.
-  void Start(int socket, SSL_CTX* tls,
-             const std::function<void(Connection&, std::uint64_t id)>& serve,
-             const std::function<void()>& closed);
+  // `closed`. After `Stop`, and if the system has no thread for it, closes the socket at once and
+  // calls `closed`.
+  void Start(int socket, SSL_CTX* tls, const Serve& serve, const std::function<void()>& closed);
   // Ends all connections and waits for their threads.
   void Stop();
 
@@ -36,6 +37,9 @@ class ConnectionThreads {
     std::thread thread;
   };
 
+  // Returns false if there is no thread; the connection is then closed.
+  bool StartThread(std::unique_ptr<Connection> made, const Serve& serve,
+                   const std::function<void()>& closed);
   void Leave(std::uint64_t id);
   void JoinFinished(std::unique_lock<std::mutex>& lock);
 

@@ -12,6 +12,7 @@
 #include <unistd.h>
 
 #include "signing/openssl_handles.h"
+#include "wire/accept.h"
 
 namespace DevSts {
 namespace {
@@ -65,29 +66,36 @@ int Listen(const addrinfo& address) {
 
 }  // namespace
 
-Listener::Listener(const std::string& address, std::uint16_t port, std::function<void(int)> accept)
-    : socket_(Listen(*Resolve(address, port))), port_(PortOf(socket_)), accept_(std::move(accept)) {
-  thread_ = std::thread([this] { AcceptUntilStopped(); });
+Listener::Listener(const std::string& address, std::uint16_t port, std::function<void(int)> accept,
+                   std::function<void(const std::string&)> failed)
+    : socket_(Listen(*Resolve(address, port))),
+      port_(PortOf(socket_)),
+      accept_(std::move(accept)),
+      failed_(std::move(failed)) {
+  try {
+    thread_ = std::thread([this] { Accept(); });
+  } catch (...) {
+    close(socket_);
+    throw;
+  }
 }
 
 Listener::~Listener() {
+  stopped_ = true;
   shutdown(socket_, SHUT_RDWR);  // ends accept() in the thread
   thread_.join();
   close(socket_);
 }
 
-void Listener::AcceptUntilStopped() {
-  for (;;) {
-    const int accepted = accept4(socket_, nullptr, nullptr, SOCK_CLOEXEC);
-    if (accepted < 0 && (errno == EINTR || errno == ECONNABORTED || errno == EMFILE)) {
-      continue;
-    }
-    if (accepted < 0) {
-      return;
-    }
+void Listener::Accept() {
+  const int error = AcceptUntilStopped(socket_, stopped_, [this](int accepted) {
     const int on = 1;
     setsockopt(accepted, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
     accept_(accepted);
+  });
+  if (error != 0) {
+    failed_("port " + std::to_string(port_) +
+            " accepts no more connections: " + std::generic_category().message(error));
   }
 }
 
