@@ -119,7 +119,7 @@ const char* SentenceOf(Reason reason) noexcept {
 std::string EndOfMessage(const VerdictFacts& facts) {
   switch (facts.reason) {
     case Reason::kUnknownIssuer:
-      return ": " + ShownText(facts.checked->token->Issuer());
+      return ": " + OtherIssuersText(facts);
     case Reason::kWrongAudience:
       return ": " + OtherAudiencesText(facts);
     case Reason::kUnrestricted:

@@ -16,6 +16,8 @@ std::string MessageText(const VerdictFacts& facts);
 /// The parts of `ComparedText` that are about time, the signer and the signature, not yet limited.
 /// The token has been read.
 std::string ValidityText(const VerdictFacts& facts);
+/// The token's issuer, for whom nobody may sign, and those for whom somebody may.
+std::string OtherIssuersText(const VerdictFacts& facts);
 std::string SignerKnownText(const VerdictFacts& facts);
 std::string SignerValidText(const VerdictFacts& facts);
 std::string SignerRevokedText(const VerdictFacts& facts);

@@ -117,7 +117,8 @@ std::string LifetimeText(const VerdictFacts& facts) {
 std::string DelegationText(const VerdictFacts& facts) {
   std::vector<Delegate> chain;
   facts.checked->token->GetDelegationChain(chain);
-  const std::string counts = std::to_string(chain.size()) + " delegates, at most " +
+  const std::string counts = std::to_string(chain.size()) +
+                             (chain.size() == 1 ? " delegate, at most " : " delegates, at most ") +
                              std::to_string(facts.Config()->deepestDelegation);
   return chain.empty() ? counts : counts + ": " + ShownList(chain, [](const Delegate& delegate) {
                                     return ShownName(delegate.delegate);

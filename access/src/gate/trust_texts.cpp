@@ -65,12 +65,18 @@ std::string ValidityText(const VerdictFacts& facts) {
              : period;
 }
 
+std::string OtherIssuersText(const VerdictFacts& facts) {
+  const std::string issuers = ShownList(facts.checked->trust->Issuers(), ShownText);
+  return ShownText(facts.checked->token->Issuer()) +
+         (issuers.empty() ? "; no signer is trusted" : "; signers are trusted for " + issuers);
+}
+
 std::string SignerKnownText(const VerdictFacts& facts) {
   const CheckedToken& checked = *facts.checked;
   const std::string& name = checked.token->Issuer();
   const IssuerTrust* const issuer = checked.trust->Find(name);
   if (issuer == nullptr) {
-    return "issuer " + ShownText(name);
+    return "issuer " + OtherIssuersText(facts);
   }
   const Signers signers = SelectSigners(*checked.trust, *checked.token);
   return "issuer " + ShownText(name) + "; of " + std::to_string(issuer->signers.size()) +

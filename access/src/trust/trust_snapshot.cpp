@@ -59,4 +59,14 @@ const IssuerTrust* TrustSnapshot::Find(std::string_view issuer) const {
   return trust.signers.empty() ? nullptr : &trust;
 }
 
+std::vector<std::string_view> TrustSnapshot::Issuers() const {
+  std::vector<std::string_view> issuers;
+  for (const auto& [issuer, trust] : named_) {
+    if (!trust.signers.empty()) {
+      issuers.push_back(issuer);
+    }
+  }
+  return issuers;
+}
+
 }  // namespace SsoClient::Access

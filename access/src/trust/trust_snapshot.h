@@ -58,6 +58,9 @@ class TrustSnapshot {
   /// Who may sign the tokens of `issuer`, in the order of the configuration; null if nobody may.
   /// Valid as long as the snapshot.
   const IssuerTrust* Find(std::string_view issuer) const;
+  /// The issuers of entries with an issuer whose tokens somebody may sign. Valid as long as the
+  /// snapshot.
+  std::vector<std::string_view> Issuers() const;
   /// Differs between the snapshots of all stores of the process.
   std::uint64_t Version() const noexcept { return version_; }
 

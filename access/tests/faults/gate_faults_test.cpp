@@ -49,7 +49,7 @@ TEST_F(GateFaultsTest, Miss) {
 TEST_F(GateFaultsTest, Hit) {
   const auto make = [this] {
     auto gate = Make();
-    gate->Check(token, presenter);
+    EXPECT_TRUE(gate->Check(token, presenter).IsAccepted());
     return gate;
   };
   const std::size_t allocations = FailEach(make, token, Reason::kNone);

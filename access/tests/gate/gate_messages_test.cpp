@@ -98,7 +98,22 @@ TEST_F(GateMessagesTest, Bearer) {
 TEST_F(GateMessagesTest, UnknownIssuer) {
   trust->Set({});
   EXPECT_EQ(Check(text).Message(),
-            "Nobody is trusted to sign tokens of this issuer: 'https://sts.example.com/STS'.");
+            "Nobody is trusted to sign tokens of this issuer: 'https://sts.example.com/STS'; no "
+            "signer is trusted.");
+}
+
+// The usual cause is a name that differs by a slash.
+TEST_F(GateMessagesTest, UnknownIssuerBesideTheKnownOnes) {
+  const Signer signer = SignerOf(TrustedCredential());
+  trust->Set({{"https://sts.example.com/STS/", {signer}},
+              {"https://empty.example", {}},
+              {"https://sts.example.com", {signer}}});
+  const Verdict verdict = Check(text);
+  const std::string both =
+      "'https://sts.example.com/STS'; signers are trusted for 'https://sts.example.com', "
+      "'https://sts.example.com/STS/'";
+  EXPECT_EQ(verdict.Message(), "Nobody is trusted to sign tokens of this issuer: " + both + ".");
+  EXPECT_EQ(RecordOf(verdict, CheckKind::kSignerKnown).compared, "issuer " + both);
 }
 
 TEST_F(GateMessagesTest, Unrestricted) {

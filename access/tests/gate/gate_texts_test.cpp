@@ -108,6 +108,16 @@ TEST_F(GateTextsTest, NamesEachPart) {
   EXPECT_EQ(compared(CheckKind::kPredicate), "no predicate");
 }
 
+TEST_F(GateTextsTest, OneDelegate) {
+  AssertionText changed = text;
+  changed.Delegate();
+  const std::string end = "</del:Delegate>";
+  const std::size_t first = changed.conditions.find("<del:Delegate ");
+  changed.conditions.erase(first, changed.conditions.find(end) + end.size() - first);
+  EXPECT_EQ(RecordOf(Check(changed), CheckKind::kDelegation).compared,
+            "1 delegate, at most 10: 'second@example.com'");
+}
+
 TEST_F(GateTextsTest, RefusalSaysBothSides) {
   config.audiences = {"https://c.example", "https://d.example", "https://e.example",
                       "https://f.example", "https://g.example"};

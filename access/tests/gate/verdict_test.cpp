@@ -24,7 +24,7 @@ TEST(VerdictTest, AcceptedByAProgram) {
     EXPECT_EQ(record.outcome, CheckOutcome::kPassed);
     EXPECT_EQ(record.compared, "");
   }
-  EXPECT_THROW(Verdict::Accept(nullptr), Tarnik::InvalidArgumentException);
+  EXPECT_THROW(static_cast<void>(Verdict::Accept(nullptr)), Tarnik::InvalidArgumentException);
 }
 
 TEST(VerdictTest, RefusedByAProgram) {
@@ -38,7 +38,8 @@ TEST(VerdictTest, RefusedByAProgram) {
   for (const CheckRecord& record : verdict.Ledger()) {
     EXPECT_EQ(record.outcome, CheckOutcome::kNotReached);
   }
-  EXPECT_THROW(Verdict::Refuse(Reason::kNone, "x"), Tarnik::InvalidArgumentException);
+  EXPECT_THROW(static_cast<void>(Verdict::Refuse(Reason::kNone, "x")),
+               Tarnik::InvalidArgumentException);
 }
 
 TEST(VerdictTest, ToString) {

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include <gtest/gtest.h>
 
@@ -79,6 +80,18 @@ TEST_F(TrustSnapshotTest, KeysOfAnotherTypeDoNotCountAmongMoreThanSixteen) {
   const Names selected = Select({}, kEcdsa);
   EXPECT_EQ(selected.size(), 16U);
   EXPECT_EQ(std::count(selected.begin(), selected.end(), "CN=rsa"), 0);
+}
+
+TEST_F(TrustSnapshotTest, IssuersAreThoseOfWhomThereAreSigners) {
+  config.issuers.emplace_back();
+  config.issuers[1].issuer = "https://other.example";
+  config.issuers[1].certificates = {Sts(1).ToCertificate()};
+  Make();
+  EXPECT_EQ(store->Current()->Issuers(),
+            (std::vector<std::string_view>{"https://other.example", kIssuer}));
+  Remove("trust/a.pem");
+  store->Reload();
+  EXPECT_EQ(store->Current()->Issuers(), std::vector<std::string_view>{"https://other.example"});
 }
 
 TEST_F(TrustSnapshotTest, NobodyIsSelectedWithoutSigners) {

@@ -98,6 +98,9 @@ def tests(source):
          count_in(source, "access/tests/gate_attacks/*.cpp", case)),
         ("of them, with failing allocations, threads, descriptors or crypto calls",
          count_in(source, "tests/faults/**/*.cpp", case) + count_in(source, "access/tests/faults/**/*.cpp", case)),
+        ("of them, secrets, token files and the terminal of the program `ssoclient`",
+         count_in(source, "tools/ssoclient/tests/input/*.cpp", case) +
+         count_in(source, "tools/ssoclient/tests/commands/terminal_test.cpp", case)),
         ("fuzzers (`fuzz`)", len(list(source.glob("fuzz/**/*_fuzz.cpp")))),
         ("seeds of the fuzzers", sum(path.is_file() for path in source.glob("fuzz/seeds/**/*"))),
         ("planted faults that the fuzzers must find (`fuzz/planted`)", len(list(source.glob("fuzz/planted/*.patch")))),

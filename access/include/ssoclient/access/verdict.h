@@ -100,34 +100,34 @@ struct VerdictFacts;
 /// What a gate has decided about a token. A value, whose copies share their content; thread-safe as
 /// one. References that it returns are valid as long as any copy. One that was moved from may only
 /// be assigned to and destroyed.
-class SSOCLIENT_ACCESS_EXPORT Verdict {
+class [[nodiscard]] Verdict {
  public:
   /// True when every check has passed.
-  bool IsAccepted() const noexcept;
+  SSOCLIENT_ACCESS_EXPORT bool IsAccepted() const noexcept;
   /// The accepted token; null when it was refused. Its `ExpirationTimeWithTolerance` has the
   /// tolerance of the gate (`GateConfig::clockTolerance`).
-  const std::shared_ptr<const SamlToken>& Token() const noexcept;
+  SSOCLIENT_ACCESS_EXPORT const std::shared_ptr<const SamlToken>& Token() const noexcept;
   /// `Reason::kNone` for an accepted token.
-  Reason Refusal() const noexcept;
+  SSOCLIENT_ACCESS_EXPORT Reason Refusal() const noexcept;
   /// Why the token was refused, in one line for people, with the rules of `CheckRecord::compared`,
   /// and without the name of the reason; empty for an accepted token. It says which audiences and
   /// signers this service knows: for its log, not for its answer to the presenter.
-  const std::string& Message() const noexcept;
+  SSOCLIENT_ACCESS_EXPORT const std::string& Message() const noexcept;
   /// A record for each `CheckKind`, in order. The texts are made by this call.
-  std::vector<CheckRecord> Ledger() const;
+  SSOCLIENT_ACCESS_EXPORT std::vector<CheckRecord> Ledger() const;
   /// The verdict as a text of several lines for people, which ends in a line feed: first the
   /// decision, with the name of the reason and the message of a refusal, and then the ledger.
-  std::string ToString() const;
+  SSOCLIENT_ACCESS_EXPORT std::string ToString() const;
 
   /// Verdicts for implementations of `TokenGate` of a program's own. In their ledgers, all checks
   /// have passed, or none has been reached, and `compared` is empty. Throw
   /// `Tarnik::InvalidArgumentException` for null and for `Reason::kNone`.
-  static Verdict Accept(std::shared_ptr<const SamlToken> token);
+  SSOCLIENT_ACCESS_EXPORT static Verdict Accept(std::shared_ptr<const SamlToken> token);
   /// The same for a refusal.
-  static Verdict Refuse(Reason reason, const std::string& message);
+  SSOCLIENT_ACCESS_EXPORT static Verdict Refuse(Reason reason, const std::string& message);
 
   /// For the library.
-  explicit Verdict(std::shared_ptr<const VerdictFacts> facts) noexcept;
+  SSOCLIENT_ACCESS_EXPORT explicit Verdict(std::shared_ptr<const VerdictFacts> facts) noexcept;
 
  private:
   std::shared_ptr<const VerdictFacts> facts_;
