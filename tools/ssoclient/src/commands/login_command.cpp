@@ -74,8 +74,7 @@ CLI::App* LoginCommand::AddTo(CLI::App& program) {
   return command;
 }
 
-[[noreturn]] void FailUsage(const std::string& kind, const std::string& message,
-                            const std::string& remedy) {
+[[noreturn]] void FailUsage(KindName kind, const std::string& message, const std::string& remedy) {
   throw ToolException({ExitStatus::kUsage, kind, message, remedy});
 }
 
