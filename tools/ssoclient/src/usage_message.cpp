@@ -63,6 +63,7 @@ std::vector<const CLI::Option*> OptionsIn(std::string_view text, const CLI::App&
   }
   std::sort(found.begin(), found.end());
   std::vector<const CLI::Option*> options;
+  options.reserve(found.size());
   for (const auto& [place, option] : found) {
     options.push_back(option);
   }
