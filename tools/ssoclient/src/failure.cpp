@@ -49,11 +49,15 @@ std::string RemedyFor(FailureKind kind) {
 
 }  // namespace
 
+Failure::Failure(ExitStatus exitStatus, KindName name, std::string text, std::string advice)
+    : status(exitStatus), kind(name.Text()), message(std::move(text)), remedy(std::move(advice)) {}
+
 ToolException::ToolException(Failure failure)
     : std::runtime_error(failure.message), failure_(std::move(failure)) {}
 
 Failure MakeFailure(FailureKind kind, std::string message) {
-  return {StatusOf(kind), Access::NameOf(kind), std::move(message), RemedyFor(kind)};
+  return {StatusOf(kind), KindName::Find(Access::NameOf(kind)), std::move(message),
+          RemedyFor(kind)};
 }
 
 Failure FailureOf(const std::exception& exception) {

@@ -8,16 +8,18 @@
 #include <ssoclient/access/failure_kind.h>
 
 #include "exit_status.h"
+#include "failure_kinds.h"
 
 namespace SsoClient::Tool {
 
 /// Why a command failed. The texts contain no secret and no token text.
 struct Failure {
-  ExitStatus status = ExitStatus::kLocal;
-  /// For programs, in lower case with hyphens, such as "refused-login" or "token-file-open".
-  std::string kind{};
-  std::string message{};  ///< one line for people
-  std::string remedy{};   ///< what the user can do; may be empty
+  Failure(ExitStatus exitStatus, KindName name, std::string text, std::string advice);
+
+  ExitStatus status;
+  std::string kind;     ///< for programs, one of `kFailureKinds`
+  std::string message;  ///< one line for people
+  std::string remedy;   ///< what the user can do; may be empty
 };
 
 /// Thrown by the parts of the program for failures of their own.

@@ -1,7 +1,6 @@
 #include "program.h"
 
 #include <algorithm>
-#include <cstddef>
 #include <exception>
 #include <memory>
 #include <ostream>
@@ -17,6 +16,7 @@
 #include "failure.h"
 #include "help/help_formatter.h"
 #include "output/safe_text.h"
+#include "usage_message.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -32,6 +32,7 @@ std::vector<Registered> AddCommands(CLI::App& program) {
   std::vector<Registered> all;
   for (std::unique_ptr<Command>& command : MakeCommands()) {
     CLI::App* const subcommand = command->AddTo(program);
+    RefuseValuesOfFlags(*subcommand);
     all.push_back({std::move(command), subcommand});
   }
   return all;
@@ -73,53 +74,6 @@ void ReportFailure(const Console& console, const Registered& chosen, const Failu
 bool IsJsonWanted(int argc, const char* const* argv) {
   return std::any_of(argv, argv + argc,
                      [](const char* each) { return std::string_view(each) == "--json"; });
-}
-
-bool IsOption(const std::string& argument) {
-  return argument.size() > 1 && argument.front() == '-';
-}
-
-// The name of an option without a value, which may be a password: "--name" of "--name=value" and
-// "-n" of "-nvalue".
-std::string NameOfOption(const std::string& argument) {
-  constexpr std::size_t kShortName = 2;
-  const bool isLong = argument.compare(0, kShortName, "--") == 0;
-  return argument.substr(0, isLong ? argument.find('=') : kShortName);
-}
-
-// What is wrong, when no command has been read: in words of our own, since those of the library
-// depend on its version.
-std::string MessageWithoutCommand(int argc, const char* const* argv) {
-  if (argc < 2) {
-    return "there is no command";
-  }
-  const std::string first = argv[1];
-  return IsOption(first) ? "there is no option " + NameOfOption(first) + " without a command"
-                         : "there is no command '" + first + "'";
-}
-
-// Arguments that the command does not have. Only names of options are repeated, since a password
-// may be among the others.
-std::string MessageOfExtras(const std::vector<std::string>& extras) {
-  const auto option = std::find_if(extras.begin(), extras.end(), IsOption);
-  return option == extras.end() ? "there are more arguments than the command has"
-                                : "there is no option " + NameOfOption(*option);
-}
-
-// The library's text ends in " = " and the value.
-std::string MessageOfConversion(const CLI::ConversionError& error) {
-  const std::string text = error.what();
-  return text.substr(0, text.find(" = "));
-}
-
-std::string MessageOf(const CLI::ParseError& error, const CLI::App& program) {
-  if (dynamic_cast<const CLI::ExtrasError*>(&error) != nullptr) {
-    return MessageOfExtras(program.remaining(true));
-  }
-  if (const auto* conversion = dynamic_cast<const CLI::ConversionError*>(&error)) {
-    return MessageOfConversion(*conversion);
-  }
-  return error.what();
 }
 
 ExitStatus ReportUsage(const Console& console, const CLI::App& program, bool isJson,
@@ -170,10 +124,8 @@ ExitStatus RunProgram(int argc, const char* const* argv, const Console& console)
     program.exit(asked, console.out, console.err);
     return ExitStatus::kDone;
   } catch (const CLI::ParseError& error) {
-    const std::string message = program.get_subcommands().empty()
-                                    ? MessageWithoutCommand(argc, argv)
-                                    : MessageOf(error, program);
-    return ReportUsage(console, program, IsJsonWanted(argc, argv), message);
+    return ReportUsage(console, program, IsJsonWanted(argc, argv),
+                       UsageMessage(error, program, argc, argv));
   }
   const auto chosen = std::find_if(commands.begin(), commands.end(), [](const Registered& each) {
     return each.subcommand->parsed();

@@ -25,9 +25,9 @@ TEST(FailureTest, AFailedExchangeMeansThatTheServiceIsUnreachable) {
 
 TEST(FailureTest, FailuresOfTheProgramAreKept) {
   const Failure failure =
-      FailureOf(ToolException({ExitStatus::kUsage, "two-secrets", "one, please", "omit one"}));
+      FailureOf(ToolException({ExitStatus::kUsage, "no-password", "one, please", "omit one"}));
   EXPECT_EQ(failure.status, ExitStatus::kUsage);
-  EXPECT_EQ(failure.kind, "two-secrets");
+  EXPECT_EQ(failure.kind, "no-password");
   EXPECT_EQ(failure.message, "one, please");
   EXPECT_EQ(failure.remedy, "omit one");
 }

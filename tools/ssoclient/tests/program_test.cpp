@@ -1,6 +1,7 @@
 #include "program.h"
 
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <gmock/gmock.h>
@@ -68,10 +69,29 @@ TEST(ProgramTest, AnUnknownOptionIsNamed) {
               HasSubstr("there is no option --wrong without a command\n"));
 }
 
-TEST(ProgramTest, AnOptionWithAWrongValueIsNamed) {
-  EXPECT_THAT(RunTool(Login({"--password-fd", "x"})).err,
-              HasSubstr("--password-fd: it must be the number of a descriptor\n"));
-  EXPECT_THAT(RunTool(Login({"--kerberos=maybe"})).err, HasSubstr("--kerberos"));
+TEST(ProgramTest, WhatIsWrongIsSaidInOneWay) {
+  const std::vector<std::pair<std::vector<std::string>, std::string>> wrong = {
+      {Login({"--password-fd", "x"}), "--password-fd: it must be the number of a descriptor"},
+      {Login({"--kerberos=maybe"}), "--kerberos takes no value"},
+      {Login({"--delegable=no"}), "--delegable takes no value"},
+      {Login({"--timeout"}), "--timeout needs its value: SECONDS"},
+      {Login({"--output"}), "--output needs its value: FILE"},
+      {Login({"--user", "bob"}), "--user can be given only once"},
+      {Login({"--kerberos"}), "--user and --kerberos exclude each other"},
+      {Login({"--service", "HTTP@sts.example"}), "--service needs --kerberos"},
+      {{"login", "--user", "alice"}, "--url is required"},
+      {{"show"}, "FILE is required"},
+      {{"verify", "--trust-for", "issuer"}, "--trust-for needs its value: ISSUER PATH"},
+      {{"verify", "--audience", "a", "--largest-token", "0", "token.xml"},
+       "--largest-token: it must not be 0"},
+      {{"verify", "--audience", "a", "--largest-token", "-1", "token.xml"},
+       "--largest-token: '-1' is not a whole number"},
+  };
+  for (const auto& [arguments, message] : wrong) {
+    const ToolResult result = RunTool(arguments);
+    EXPECT_EQ(result.status, 2);
+    EXPECT_EQ(result.err.substr(0, result.err.find('\n')), "ssoclient: " + message);
+  }
 }
 
 }  // namespace

@@ -74,8 +74,7 @@ CLI::App* LoginCommand::AddTo(CLI::App& program) {
   return command;
 }
 
-[[noreturn]] void FailUsage(const std::string& kind, const std::string& message,
-                            const std::string& remedy) {
+[[noreturn]] void FailUsage(KindName kind, const std::string& message, const std::string& remedy) {
   throw ToolException({ExitStatus::kUsage, kind, message, remedy});
 }
 
@@ -88,7 +87,7 @@ void LoginCommand::CheckLogin() const {
     FailUsage("no-user", "a password needs a user", "use --user");
   }
   if (isByKey && request_.WantsBearer()) {
-    FailUsage("bearer-by-key", "a login with a key alone gives a token that is bound to the key",
+    FailUsage("bearer-by-key", "a login with only a key gives a token that is bound to the key",
               "omit --bearer");
   }
   if (request_.WantsHolderOfKey() && !key_.IsGiven()) {
@@ -149,7 +148,7 @@ Outcome LoginCommand::Run(const Console& console) {
   const ServiceSetup setup = MakeSetup();
   const TokenSpec spec = request_.MakeSpec(mayBeOpen_);
   const Token token = Login(console, setup, spec);
-  // Only a login with the key alone binds a token on behalf of somebody to it.
+  // Only a login with nothing but the key binds a token on behalf of somebody to it.
   const bool isByKey = user_.empty() && !kerberos_.IsGiven();
   const bool isBearer = !key_.IsGiven() || request_.WantsBearer() || (spec.actAsToken && !isByKey);
   return output_.Deliver(console, *token, FindDeviations(*token, spec, isBearer), WantsJson());

@@ -19,12 +19,12 @@ namespace {
 
 [[noreturn]] void Fail(const std::string& what, const std::string& message,
                        const std::string& remedy = "") {
-  throw ToolException({ExitStatus::kLocal, what + "-file", message, remedy});
+  throw ToolException({ExitStatus::kLocal, KindName::Find(what + "-file"), message, remedy});
 }
 
 [[noreturn]] void FailAsOpen(const PrivateFile& file, const std::string& message,
                              const std::string& remedy) {
-  throw ToolException({ExitStatus::kLocal, file.what + "-file-open", message,
+  throw ToolException({ExitStatus::kLocal, KindName::Find(file.what + "-file-open"), message,
                        remedy + ", or allow it with --allow-open-files"});
 }
 

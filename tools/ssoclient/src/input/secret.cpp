@@ -33,7 +33,7 @@ SecretText ReadLine(int descriptor, const std::string& name) {
     const ssize_t size = RetryInterrupted([&] { return read(descriptor, &next, 1); });
     if (size < 0) {
       throw ToolException(
-          {ExitStatus::kLocal, name + "-fd",
+          {ExitStatus::kLocal, KindName::Find(name + "-fd"),
            "cannot read the descriptor " + std::to_string(descriptor) + ": " + SystemMessage(errno),
            ""});
     }
@@ -71,7 +71,7 @@ SecretText SecretOption::ReadUnchecked(const std::string& prompt, bool mayBeOpen
                                     : ReadLine(descriptor_, name_);
   }
   if (!HasTerminal()) {
-    throw ToolException({ExitStatus::kUsage, "no-" + name_,
+    throw ToolException({ExitStatus::kUsage, KindName::Find("no-" + name_),
                          "there is no terminal to ask for the " + name_,
                          "use --" + name_ + "-file or --" + name_ + "-fd"});
   }
@@ -88,11 +88,12 @@ SecretText SecretOption::Read(const std::string& prompt, bool mayBeOpen) const {
     secret.Truncate(secret.Text().size() - 1);
   }
   if (secret.Text().empty()) {
-    throw ToolException({ExitStatus::kLocal, "no-" + name_, "the " + name_ + " is empty", ""});
+    throw ToolException(
+        {ExitStatus::kLocal, KindName::Find("no-" + name_), "the " + name_ + " is empty", ""});
   }
   if (secret.Text().size() > kMaxSecretBytes) {
     throw ToolException(
-        {ExitStatus::kLocal, name_ + "-long",
+        {ExitStatus::kLocal, KindName::Find(name_ + "-long"),
          "the " + name_ + " is longer than " + std::to_string(kMaxSecretBytes) + " bytes", ""});
   }
   return secret;

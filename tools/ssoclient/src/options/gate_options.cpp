@@ -39,6 +39,12 @@ std::string CheckCount(const std::string& text) {
   return isCount ? std::string() : "'" + text + "' is not a whole number";
 }
 
+std::string CheckPositiveCount(const std::string& text) {
+  const bool isZero = text.find_first_not_of('0') == std::string::npos;
+  const std::string fault = CheckCount(text);
+  return fault.empty() && isZero ? "it must not be 0" : fault;
+}
+
 // "DOMAIN\name", as groups are written in tokens, or "name@DOMAIN".
 PrincipalId ParseGroup(const std::string& text) {
   if (const std::size_t slash = text.find('\\'); slash != std::string::npos) {
@@ -154,8 +160,7 @@ void GateOptions::AddLimitsTo(CLI::App& command) {
       .add_option("--largest-token", largestToken_, "How long the text of a token may be, in bytes")
       ->type_name("BYTES")
       ->capture_default_str()
-      ->check(CheckCount)
-      ->check(CLI::PositiveNumber)
+      ->check(CheckPositiveCount)
       ->group("Limit");
   command
       .add_option("--at", time_,

@@ -33,7 +33,9 @@ Failure FailureIn(Call call) {
   } catch (const ToolException& exception) {
     return exception.What();
   }
-  return {ExitStatus::kDone, "", "", ""};
+  Failure none{ExitStatus::kDone, "local", "", ""};
+  none.kind.clear();
+  return none;
 }
 
 TEST(TokenFileTest, IsReadWithoutTheWhiteSpaceAroundIt) {

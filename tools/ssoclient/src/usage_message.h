@@ -1,0 +1,21 @@
+#ifndef SSOCLIENT_TOOL_USAGE_MESSAGE_H
+#define SSOCLIENT_TOOL_USAGE_MESSAGE_H
+
+#include <string>
+
+#include <CLI/CLI.hpp>
+
+namespace SsoClient::Tool {
+
+/// Lets no flag of the command have a value, as "--json=1" would.
+void RefuseValuesOfFlags(CLI::App& command);
+
+/// What is wrong with a command line that `program` has refused with `error`, in one line. The
+/// words are our own, since those of the library depend on its version, and repeat only what cannot
+/// be a password: names of options and commands, and values that a check of ours has refused.
+std::string UsageMessage(const CLI::ParseError& error, const CLI::App& program, int argc,
+                         const char* const* argv);
+
+}  // namespace SsoClient::Tool
+
+#endif
