@@ -10,7 +10,10 @@ FILENAME !~ /\.json$/ {
   gsub(/^ *"file": *|,? *$/, "", source)
   if (!(source in unit_of)) next
   unit = unit_of[source]
-  sub(/ -c [^ ]*",? *$/, " -c " unit "\",", command)
+  # A source also finds the headers of its own folder.
+  folder = source
+  gsub(/^"|\/[^\/]*$/, "", folder)
+  sub(/ -c [^ ]*",? *$/, " -iquote " folder " -c " unit "\",", command)
   print (printed++ ? "," : "[") "{\n" directory "\n" command "\n  \"file\": \"" unit "\"\n}"
 }
 END { print "]" }

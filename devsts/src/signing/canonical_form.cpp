@@ -90,6 +90,7 @@ std::string CanonicalForm(xmlDoc* document, xmlNode* element, CanonicalMode mode
                           const std::vector<std::string>& inclusivePrefixes) {
   std::vector<std::string> names = inclusivePrefixes;
   std::vector<xmlChar*> prefixes;
+  prefixes.reserve(names.size() + 1);
   for (std::string& name : names) {
     prefixes.push_back(reinterpret_cast<xmlChar*>(name.data()));
   }

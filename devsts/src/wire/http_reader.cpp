@@ -21,7 +21,7 @@ namespace http = boost::beast::http;
 using Parser = http::request_parser<http::string_body>;
 
 constexpr std::uint32_t kHeadLimit = 1024 * 1024;
-constexpr std::uint64_t kBodyLimit = 64 * 1024 * 1024;
+constexpr std::uint64_t kBodyLimit = std::uint64_t{64} * 1024 * 1024;
 
 std::string AsString(boost::beast::string_view text) {
   return {text.data(), text.size()};
@@ -79,7 +79,7 @@ HttpReader::Outcome HttpReader::Next(ReceivedRequest& request, bool& keepAlive) 
 }
 
 bool HttpReader::ReadMore() {
-  std::array<char, 16 * 1024> octets{};
+  std::array<char, 16384> octets{};
   const std::size_t size = connection_.Read(octets.data(), octets.size());
   buffer_.append(octets.data(), size);
   return size != 0;

@@ -97,7 +97,7 @@ WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool 
   wire.status = answer.status;
   wire.octets += "HTTP/1.1 " + std::to_string(answer.status) + " " + answer.reason + "\r\n";
   for (const auto& [name, value] : answer.headers) {
-    wire.octets += name + ": " + value + "\r\n";
+    wire.octets.append(name).append(": ").append(value).append("\r\n");
   }
   wire.octets += "\r\n";
   wire.headSize = wire.octets.size();

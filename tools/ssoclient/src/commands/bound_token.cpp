@@ -32,7 +32,7 @@ std::shared_ptr<const SamlToken> ReadBoundToken(
     const std::string& path, bool mayBeOpen, const Tarnik::Xml::Security::KeyInfoResolver& signers,
     const HolderOfKeyConfig& key) {
   const SecretText text = ReadTokenFile(path, mayBeOpen);
-  const auto token = ReadUnverifiedToken(text.Text());
+  auto token = ReadUnverifiedToken(text.Text());
   Verify(text.Text(), signers);
   const auto holder = token->HolderOfKeyCertificate();
   if (holder == nullptr || !key.privateKey->Matches(*holder)) {

@@ -84,7 +84,7 @@ std::string OptionName(const CLI::Option& option) {
 }
 
 std::string OptionText(const CLI::Option& option) {
-  std::string text = option.get_description();
+  const std::string& text = option.get_description();
   std::string notes;
   const auto add = [&notes](const std::string& note) {
     notes += (notes.empty() ? "" : "; ") + note;

@@ -38,7 +38,7 @@ std::string Rewritten(std::string_view text, Write write) {
 }  // namespace
 
 std::string SafeText(const Console& console, std::string_view text) {
-  const std::string shown = Tarnik::ToDisplayText(text, kMaxShownBytes);
+  std::string shown = Tarnik::ToDisplayText(text, kMaxShownBytes);
   if (console.isUtf8) {
     return shown;
   }

@@ -57,6 +57,7 @@ void AddSubject(const SamlToken& token, Rows& rows) {
   std::vector<PrincipalId> groups;
   token.GetGroups(groups);
   std::vector<std::string> texts;
+  texts.reserve(groups.size());
   for (const PrincipalId& group : groups) {
     texts.push_back(group.domain.empty() ? group.name : group.domain + "\\" + group.name);
   }
@@ -70,6 +71,7 @@ void AddUse(const SamlToken& token, Rows& rows) {
   std::vector<Delegate> chain;
   token.GetDelegationChain(chain);
   std::vector<std::string> texts;
+  texts.reserve(chain.size());
   for (const Delegate& each : chain) {
     texts.push_back("to " + PrincipalText(each.delegate) + " on " +
                     TimeText(each.delegationInstant));
