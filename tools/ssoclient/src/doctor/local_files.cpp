@@ -36,18 +36,6 @@ std::optional<Finding> FileProblem(const std::string& path) {
   return std::nullopt;
 }
 
-std::optional<Finding> PermissionProblem(const std::string& path) {
-  struct stat status {};
-  if (stat(path.c_str(), &status) != 0 ||
-      (status.st_mode & (S_IRGRP | S_IWGRP | S_IROTH | S_IWOTH)) == 0) {
-    return std::nullopt;
-  }
-  return Warning(
-      ExitStatus::kLocal, "key-readable-by-others",
-      "the group or others may read or change " + Quoted(path) + ", which contains a key",
-      "chmod 600 " + path + "; other commands refuse it without --allow-open-files");
-}
-
 std::optional<Finding> ValidityProblem(const std::string& what,
                                        const Tarnik::Crypto::Certificate& certificate,
                                        const Tarnik::System::DateTime& now) {

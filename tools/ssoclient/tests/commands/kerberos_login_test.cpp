@@ -1,13 +1,10 @@
-#include <memory>
 #include <string>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
-#include <stdlib.h>
 
-#include <devsts/kerberos_realm.h>
-
+#include "support/kerberos_service.h"
 #include "support/service_fixture.h"
 
 namespace SsoClient::Tool::Testing {
@@ -15,60 +12,37 @@ namespace {
 
 using testing::HasSubstr;
 
-constexpr const char* kService = "HTTP@sts.example";
-
-struct Kerberos {
-  Kerberos() {
-    // Read by the dev STS, in this process, when it begins to accept tickets.
-    setenv("KRB5_CONFIG", realm.ConfigPath().c_str(), 1);
-    realm.AddUser("alice", "alice-secret");
-    aliceCache = realm.Login("alice", "alice-secret");
-    machineKeytab = realm.AddKeytab("machine");
-    DevSts::ServerOptions options;
-    options.negotiation.keytab = realm.AddKeytab("HTTP/sts.example");
-    sts = std::make_unique<DevSts::Server>(options);
-  }
-
-  DevSts::KerberosRealm realm;
-  std::string aliceCache;
-  std::string machineKeytab;
-  std::unique_ptr<DevSts::Server> sts;
-};
-
-Kerberos& TheKerberos() {
-  static Kerberos kerberos;
-  return kerberos;
-}
+constexpr const char* kService = KerberosService::kService;
 
 class KerberosLoginTest : public ServiceTest {
  protected:
   KerberosLoginTest() {
-    WritePrivate("ca.pem", TheKerberos().sts->CaCertificatePem());
-    WritePrivate("sts.pem", TheKerberos().sts->SigningCertificatePem());
+    WritePrivate("ca.pem", KerberosService::Shared().Sts().CaCertificatePem());
+    WritePrivate("sts.pem", KerberosService::Shared().Sts().SigningCertificatePem());
   }
 
   ToolResult LogInByKerberos(const std::vector<std::string>& arguments) const {
     ToolOptions options;
-    options.arguments = Joined({"login", "--url", TheKerberos().sts->HttpsUrl(), "--ca",
-                                PathOf("ca.pem"), "--sts-certificate", PathOf("sts.pem"),
+    options.arguments = Joined({"login", "--url", KerberosService::Shared().Sts().HttpsUrl(),
+                                "--ca", PathOf("ca.pem"), "--sts-certificate", PathOf("sts.pem"),
                                 "--kerberos", "--json", "--output", PathOf("token")},
                                arguments);
-    options.environment["KRB5_CONFIG"] = TheKerberos().realm.ConfigPath();
-    options.environment["KRB5CCNAME"] = "FILE:" + PathOf("none");
+    options.environment = KerberosService::Shared().Environment();
     return RunTool(options);
   }
 };
 
 TEST_F(KerberosLoginTest, LogsInWithTheTicketsOfACache) {
   const ToolResult result =
-      LogInByKerberos({"--service", kService, "--ccache", TheKerberos().aliceCache});
+      LogInByKerberos({"--service", kService, "--ccache", KerberosService::Shared().AliceCache()});
   ASSERT_EQ(result.status, 0) << result.out << result.err;
   EXPECT_EQ(result.Json()["token"]["subject"]["name"], "alice");
 }
 
 TEST_F(KerberosLoginTest, LogsInWithAKeytab) {
-  const ToolResult result = LogInByKerberos(
-      {"--service", kService, "--principal", "machine", "--keytab", TheKerberos().machineKeytab});
+  const ToolResult result =
+      LogInByKerberos({"--service", kService, "--principal", "machine", "--keytab",
+                       KerberosService::Shared().MachineKeytab()});
   ASSERT_EQ(result.status, 0) << result.out << result.err;
   EXPECT_EQ(result.Json()["token"]["subject"]["name"], "machine");
 }
