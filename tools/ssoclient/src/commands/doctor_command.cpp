@@ -1,4 +1,6 @@
+#include <cstddef>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <CLI/CLI.hpp>
@@ -16,6 +18,15 @@
 
 namespace SsoClient::Tool {
 namespace {
+
+constexpr std::size_t kMaxKeytabBytes = std::size_t{1024} * 1024;
+
+// Empty for other forms than a file, which are names that only the Kerberos library can resolve.
+std::string PathOfKeytab(const std::string& keytab) {
+  constexpr std::string_view kFileForm = "FILE:";
+  const std::string path = keytab.starts_with(kFileForm) ? keytab.substr(kFileForm.size()) : keytab;
+  return path.find(':') == std::string::npos ? path : "";
+}
 
 class DoctorCommand final : public Command {
  public:
@@ -88,13 +99,17 @@ Doctor::Plan DoctorCommand::MakePlan() const {
   plan.user = user_;
   plan.certificateFile = key_.CertificateFile();
   plan.keyFile = key_.KeyFile();
-  plan.keytabFile = kerberos_.KeytabFile();
+  plan.keytabFile = PathOfKeytab(kerberos_.Keytab());
   plan.login = Kind();
   plan.isHttpAllowed = isHttpAllowed_;
   plan.makeSslContext = [this] { return connection_.MakeSslContext(); };
   plan.readPassword = [this] { return password_.Read("Password for " + user_ + ": ", mayBeOpen_); };
   plan.loadIdentity = [this] { return key_.Load(mayBeOpen_); };
-  plan.checkKeytab = [this] { kerberos_.CheckKeytab(mayBeOpen_); };
+  plan.checkKeytab = [this, path = plan.keytabFile] {
+    // The Kerberos library reads the content.
+    ReadPrivateFile(
+        {.path = path, .what = "keytab", .maxBytes = kMaxKeytabBytes, .mayBeOpen = mayBeOpen_});
+  };
   plan.makeKerberosHandler = [this](const std::string& host) {
     return kerberos_.MakeHandler(host);
   };

@@ -128,7 +128,6 @@ Token LoginCommand::Login(const Console& console, const ServiceSetup& setup,
 Token LoginCommand::LoginByAny(const Console& console, const ServiceSetup& setup,
                                const TokenSpec& spec) const {
   if (kerberos_.IsGiven()) {
-    kerberos_.CheckKeytab(mayBeOpen_);
     return RunCall<Token>(console, setup,
                           [handler = kerberos_.MakeHandler(setup.address.host),
                            spec](const SecurityTokenService& service) {

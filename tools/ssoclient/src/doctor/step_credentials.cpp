@@ -53,7 +53,7 @@ void Show(Step& step, const Certificate& certificate) {
 
 std::optional<Finding> FilesProblem(const Plan& plan) {
   for (const std::string& path : {plan.certificateFile, plan.keyFile}) {
-    const std::optional<Finding> problem = path.empty() ? std::nullopt : FileProblem(path);
+    std::optional<Finding> problem = path.empty() ? std::nullopt : FileProblem(path);
     if (problem) {
       return problem;
     }

@@ -1,7 +1,5 @@
 #include "options/kerberos_options.h"
 
-#include <cstddef>
-#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -12,7 +10,6 @@
 #include <tarnik/core/exception.h>
 
 #include "failure.h"
-#include "input/private_file.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -75,24 +72,6 @@ CLI::Option* KerberosOptions::AddTo(CLI::App& command, const std::string& group)
       ->needs(kerberos)
       ->group(group);
   return kerberos;
-}
-
-std::string KerberosOptions::KeytabFile() const {
-  constexpr std::string_view kFileForm = "FILE:";
-  const std::string path =
-      keytab_.starts_with(kFileForm) ? keytab_.substr(kFileForm.size()) : keytab_;
-  // Other forms than a path are names that only the Kerberos library can resolve.
-  return path.find(':') == std::string::npos ? path : "";
-}
-
-void KerberosOptions::CheckKeytab(bool mayBeOpen) const {
-  constexpr std::size_t kMaxKeytabBytes = std::size_t{1024} * 1024;
-  const std::string path = KeytabFile();
-  if (!path.empty()) {
-    // The Kerberos library reads the content.
-    ReadPrivateFile(
-        {.path = path, .what = "keytab", .maxBytes = kMaxKeytabBytes, .mayBeOpen = mayBeOpen});
-  }
 }
 
 std::shared_ptr<NegotiationHandler> KerberosOptions::MakeHandler(const std::string& host) const {

@@ -21,12 +21,11 @@ class KerberosOptions {
   CLI::Option* AddTo(CLI::App& command, const std::string& group);
 
   bool IsGiven() const { return isGiven_; }
-  /// The file of --keytab; empty without one, and for a keytab that is not a file.
-  std::string KeytabFile() const;
-
-  /// Throws `ToolException`, with the kind "keytab-file-open" for the latter, when the file of
-  /// --keytab cannot be read, and when others can use it, unless `mayBeOpen`.
-  void CheckKeytab(bool mayBeOpen) const;
+  /// The values of the options, which may be empty.
+  const std::string& Service() const { return service_; }
+  const std::string& Principal() const { return principal_; }
+  const std::string& CredentialCache() const { return credentialCache_; }
+  const std::string& Keytab() const { return keytab_; }
 
   /// Creates the legs of a login to the service on `host`, which --service replaces. Failures of
   /// Kerberos are `ToolException`s of the kind "kerberos". Throws `ToolException` for a malformed

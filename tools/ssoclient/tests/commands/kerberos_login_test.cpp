@@ -12,37 +12,37 @@ namespace {
 
 using testing::HasSubstr;
 
-constexpr const char* kService = KerberosService::kService;
+constexpr const char* kService = "HTTP@sts.example";
 
 class KerberosLoginTest : public ServiceTest {
  protected:
   KerberosLoginTest() {
-    WritePrivate("ca.pem", KerberosService::Shared().Sts().CaCertificatePem());
-    WritePrivate("sts.pem", KerberosService::Shared().Sts().SigningCertificatePem());
+    WritePrivate("ca.pem", TheKerberos().sts->CaCertificatePem());
+    WritePrivate("sts.pem", TheKerberos().sts->SigningCertificatePem());
   }
 
   ToolResult LogInByKerberos(const std::vector<std::string>& arguments) const {
     ToolOptions options;
-    options.arguments = Joined({"login", "--url", KerberosService::Shared().Sts().HttpsUrl(),
-                                "--ca", PathOf("ca.pem"), "--sts-certificate", PathOf("sts.pem"),
+    options.arguments = Joined({"login", "--url", TheKerberos().sts->HttpsUrl(), "--ca",
+                                PathOf("ca.pem"), "--sts-certificate", PathOf("sts.pem"),
                                 "--kerberos", "--json", "--output", PathOf("token")},
                                arguments);
-    options.environment = KerberosService::Shared().Environment();
+    options.environment["KRB5_CONFIG"] = TheKerberos().realm.ConfigPath();
+    options.environment["KRB5CCNAME"] = "FILE:" + PathOf("none");
     return RunTool(options);
   }
 };
 
 TEST_F(KerberosLoginTest, LogsInWithTheTicketsOfACache) {
   const ToolResult result =
-      LogInByKerberos({"--service", kService, "--ccache", KerberosService::Shared().AliceCache()});
+      LogInByKerberos({"--service", kService, "--ccache", TheKerberos().aliceCache});
   ASSERT_EQ(result.status, 0) << result.out << result.err;
   EXPECT_EQ(result.Json()["token"]["subject"]["name"], "alice");
 }
 
 TEST_F(KerberosLoginTest, LogsInWithAKeytab) {
-  const ToolResult result =
-      LogInByKerberos({"--service", kService, "--principal", "machine", "--keytab",
-                       KerberosService::Shared().MachineKeytab()});
+  const ToolResult result = LogInByKerberos(
+      {"--service", kService, "--principal", "machine", "--keytab", TheKerberos().machineKeytab});
   ASSERT_EQ(result.status, 0) << result.out << result.err;
   EXPECT_EQ(result.Json()["token"]["subject"]["name"], "machine");
 }

@@ -225,32 +225,33 @@ TEST_F(DoctorLoginTest, ACertificateLogsIn) {
 }
 
 TEST_F(DoctorLoginTest, KerberosLogsInWithTicketsOrAKeytab) {
-  KerberosService& kerberos = KerberosService::Shared();
-  const TemporaryFile ofRealm(kerberos.Sts().CaCertificatePem());
-  const TemporaryFile signerOfRealm(kerberos.Sts().SigningCertificatePem());
+  const Kerberos& kerberos = TheKerberos();
+  const TemporaryFile ofRealm(kerberos.sts->CaCertificatePem());
+  const TemporaryFile signerOfRealm(kerberos.sts->SigningCertificatePem());
   ToolOptions options;
-  options.environment = kerberos.Environment();
+  options.environment = {{"KRB5_CONFIG", kerberos.realm.ConfigPath()},
+                         {"KRB5CCNAME", "FILE:/nonexistent/cache"}};
   const auto run = [&](const std::string& option, const std::string& value) {
     options.arguments = {"doctor",
                          "--json",
                          "--url",
-                         kerberos.Sts().HttpsUrl(),
+                         kerberos.sts->HttpsUrl(),
                          "--ca",
                          ofRealm.Path(),
                          "--sts-certificate",
                          signerOfRealm.Path(),
                          "--kerberos",
                          "--service",
-                         KerberosService::kService,
+                         "HTTP@sts.example",
                          option,
                          value};
     return DoctorRun(options);
   };
-  const DoctorRun byTickets = run("--ccache", kerberos.AliceCache());
+  const DoctorRun byTickets = run("--ccache", kerberos.aliceCache);
   EXPECT_EQ(byTickets.Status(), 0) << byTickets.Text();
   EXPECT_EQ(byTickets.Finding("login"), "ok");
   EXPECT_EQ(byTickets.Detail("token", "/subject"), "\"alice@EXAMPLE.COM\"");
-  const DoctorRun byKeytab = run("--keytab", kerberos.MachineKeytab());
+  const DoctorRun byKeytab = run("--keytab", kerberos.machineKeytab);
   EXPECT_EQ(byKeytab.Status(), 0) << byKeytab.Text();
   EXPECT_EQ(byKeytab.Finding("credentials"), "ok");
   EXPECT_EQ(byKeytab.Detail("token", "/subject"), "\"machine@EXAMPLE.COM\"");

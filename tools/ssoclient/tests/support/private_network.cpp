@@ -154,6 +154,9 @@ unsigned char ResponseCode(NameServer server) {
     socklen_t size = sizeof client;
     auto* const address = reinterpret_cast<sockaddr*>(&client);
     const ssize_t length = recvfrom(socket, message.data(), message.size(), 0, address, &size);
+    if (length < 0) {
+      _exit(1);
+    }
     message[2] |= kResponse;
     message[3] = kRecursionAvailable | code;
     sendto(socket, message.data(), static_cast<std::size_t>(length), 0, address, size);
