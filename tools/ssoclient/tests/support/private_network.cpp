@@ -72,8 +72,10 @@ bool Unshare(const Plan& plan) {
 }
 
 bool Mount(const Plan& plan) {
-  // Mounts are not passed on to the rest of the system.
+  // Mounts are not passed on to the rest of the system, which cannot be had in a folder that is the
+  // root (chroot) but not a mount.
   if (mount("none", "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0) {
+    errno = errno == EINVAL ? EPERM : errno;
     return false;
   }
   for (const auto& [source, target] : plan.files) {
