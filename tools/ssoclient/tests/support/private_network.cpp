@@ -219,7 +219,9 @@ std::function<void()> EnterPrivateNetwork(const PrivateNetwork& network) {
     if (const char* const what = Enter(*plan)) {
       const char* const reason = strerrordesc_np(errno);
       for (const char* const part : {"private network: ", what, ": ", reason, "\n"}) {
-        static_cast<void>(write(STDERR_FILENO, part, std::strlen(part)));
+        if (write(STDERR_FILENO, part, std::strlen(part)) < 0) {
+          break;
+        }
       }
       _exit(1);
     }
