@@ -1,4 +1,6 @@
+#include <cstddef>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <CLI/CLI.hpp>
@@ -7,6 +9,7 @@
 #include "commands/commands.h"
 #include "doctor/render.h"
 #include "doctor/runner.h"
+#include "input/private_file.h"
 #include "input/secret.h"
 #include "options/connection_options.h"
 #include "options/kerberos_options.h"
@@ -33,6 +36,7 @@ class DoctorCommand final : public Command {
   std::vector<std::string> signerFiles_;
   std::string user_;
   bool isHttpAllowed_ = false;
+  bool mayBeOpen_ = false;
   bool isStrict_ = false;
 };
 
@@ -48,6 +52,7 @@ CLI::App* DoctorCommand::AddTo(CLI::App& program) {
   AddHttpOption(*command, isHttpAllowed_);
   AddSignersOption(*command, signerFiles_);
   AddLoginOptions(*command);
+  AddOpenFilesOption(*command, mayBeOpen_);
   command->add_flag("--strict", isStrict_, "Treat warnings as failures in the exit status");
   AddJsonOption(*command);
   return command;
@@ -85,15 +90,18 @@ Doctor::Plan DoctorCommand::MakePlan() const {
   plan.user = user_;
   plan.certificateFile = key_.CertificateFile();
   plan.keyFile = key_.KeyFile();
-  plan.kerberosService = kerberos_.Service();
-  plan.principal = kerberos_.Principal();
-  plan.credentialCache = kerberos_.CredentialCache();
-  plan.keytab = kerberos_.Keytab();
+  plan.keytabFile = kerberos_.Keytab();
   plan.login = Kind();
   plan.isHttpAllowed = isHttpAllowed_;
   plan.makeSslContext = [this] { return connection_.MakeSslContext(); };
-  plan.readPassword = [this] { return password_.Read("Password for " + user_ + ": ", false); };
-  plan.loadIdentity = [this](bool mayBeOpen) { return key_.Load(mayBeOpen); };
+  plan.readPassword = [this] { return password_.Read("Password for " + user_ + ": ", mayBeOpen_); };
+  plan.loadIdentity = [this] { return key_.Load(mayBeOpen_); };
+  plan.checkKeytab = [this, path = plan.keytabFile] {
+    CheckPrivateFile({.path = path, .what = "keytab", .mayBeOpen = mayBeOpen_});
+  };
+  plan.makeKerberosHandler = [this](const std::string& host) {
+    return kerberos_.MakeHandler(host, mayBeOpen_);
+  };
   return plan;
 }
 

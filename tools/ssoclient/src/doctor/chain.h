@@ -49,7 +49,7 @@ ChainFacts Verify(const std::vector<OwnedX509>& chain, const ChainTrust& trust,
                   const std::string& expectedName);
 
 /// What that means at `now`.
-Finding JudgeChain(const ChainFacts& facts, const Tarnik::System::DateTime& now);
+Finding FindingOfChain(const ChainFacts& facts, const Tarnik::System::DateTime& now);
 
 }  // namespace SsoClient::Tool::Doctor
 

@@ -16,8 +16,8 @@ bool HasAny(const ChainFacts& facts, std::initializer_list<int> errors) {
                      [&](int error) { return facts.errors.count(error) != 0; });
 }
 
-Finding Untrusted(std::string name, std::string message, std::string remedy) {
-  return Failure(ExitStatus::kUnreachable, std::move(name), std::move(message), std::move(remedy));
+Finding Untrusted(FindingName name, std::string message, std::string remedy) {
+  return Failure(ExitStatus::kUnreachable, name, std::move(message), std::move(remedy));
 }
 
 Finding UnknownIssuer(const ChainFacts& facts) {
@@ -86,7 +86,7 @@ Finding OutOfDate(const ChainFacts& facts, const Tarnik::System::DateTime& now) 
                    "--ca");
 }
 
-Finding JudgeErrors(const ChainFacts& facts, const Tarnik::System::DateTime& now) {
+Finding FindingOfErrors(const ChainFacts& facts, const Tarnik::System::DateTime& now) {
   if (HasAny(facts, {X509_V_ERR_CERT_REVOKED})) {
     return Untrusted("revoked", "a certificate of the chain is revoked",
                      "have a new certificate issued for the service");
@@ -116,9 +116,9 @@ Finding JudgeErrors(const ChainFacts& facts, const Tarnik::System::DateTime& now
 
 }  // namespace
 
-Finding JudgeChain(const ChainFacts& facts, const Tarnik::System::DateTime& now) {
+Finding FindingOfChain(const ChainFacts& facts, const Tarnik::System::DateTime& now) {
   if (!facts.errors.empty()) {
-    return JudgeErrors(facts, now);
+    return FindingOfErrors(facts, now);
   }
   for (const ChainLink& link : facts.links) {
     const long days = DaysUntil(link.notAfter, now);

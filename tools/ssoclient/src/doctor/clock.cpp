@@ -5,6 +5,8 @@
 #include <cstdio>
 #include <string>
 
+#include "service/clock_offset.h"
+
 namespace SsoClient::Tool::Doctor {
 namespace {
 
@@ -26,10 +28,10 @@ ClockOffset OffsetOf(long serviceTime, long sentAt, long receivedAt) {
   return {service - (sent + received) / 2, (received - sent) / 2 + kHalfSecond};
 }
 
-Finding JudgeClock(const ClockOffset& offset) {
+Finding FindingOfClock(const ClockOffset& offset) {
   const double distance = std::abs(offset.seconds);
   const std::string message = "the clock of the service is " + Seconds(distance) +
-                              (offset.seconds < 0 ? " behind" : " ahead of") +
+                              (offset.seconds < 0 ? " earlier than" : " later than") +
                               " this machine's, to within " + Seconds(offset.uncertainty);
   const char* remedy = "synchronise the clocks of both machines, with NTP for example";
   const double least = distance - offset.uncertainty;
@@ -37,7 +39,7 @@ Finding JudgeClock(const ClockOffset& offset) {
     return Failure(ExitStatus::kLocal, "clock-far-off", message + "; tokens are not accepted",
                    remedy);
   }
-  if (least > kRequestTolerance) {
+  if (least > static_cast<double>(kLargeClockOffsetSec)) {
     return Warning(ExitStatus::kLocal, "clock-off", message + "; many services refuse requests",
                    remedy);
   }

@@ -17,14 +17,12 @@ struct ClockOffset {
 /// Unix time on this machine, has the Date `serviceTime` in seconds of Unix time.
 ClockOffset OffsetOf(long serviceTime, long sentAt, long receivedAt);
 
-/// More than this is a warning: services tolerate about a minute between the Created of a request
-/// and their own time.
-inline constexpr double kRequestTolerance = 60;
-/// More than this is a failure: the library tolerates 600 s when it checks the validity of a token.
+/// More than this is a failure, and more than `kLargeClockOffsetSec` a warning: the library
+/// tolerates 600 s when it checks the validity of a token.
 inline constexpr double kTokenTolerance = 600;
 
 /// What the offset means.
-Finding JudgeClock(const ClockOffset& offset);
+Finding FindingOfClock(const ClockOffset& offset);
 
 }  // namespace SsoClient::Tool::Doctor
 

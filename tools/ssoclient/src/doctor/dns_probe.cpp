@@ -83,7 +83,7 @@ Resolution ResolveUntil(const Resolver& resolver, const std::string& host, int p
   return resolution;
 }
 
-Finding JudgeResolution(const std::string& host, const Resolution& resolution) {
+Finding FindingOfResolution(const std::string& host, const Resolution& resolution) {
   if (resolution.isTimedOut) {
     return Failure(ExitStatus::kUnreachable, "dns-timed-out",
                    "no name server has answered in time for '" + host + "'", kNoServerRemedy);
@@ -97,13 +97,14 @@ Finding JudgeResolution(const std::string& host, const Resolution& resolution) {
 #endif
       return Failure(ExitStatus::kUnreachable, "unknown-host",
                      "there is no host '" + host + "': " + resolution.errorText, kUnknownRemedy);
-    case EAI_AGAIN:
-      return Failure(ExitStatus::kUnreachable, "no-name-server",
-                     "no name server answers for '" + host + "': " + resolution.errorText,
-                     kNoServerRemedy);
-    default:
-      return Failure(ExitStatus::kUnreachable, "dns-failed",
+    case EAI_SYSTEM:
+    case EAI_MEMORY:
+      return Failure(ExitStatus::kLocal, "local-failure",
                      "the look-up of '" + host + "' has failed: " + resolution.errorText,
+                     "check what this machine has left of memory and descriptors");
+    default:
+      return Failure(ExitStatus::kUnreachable, "no-name-server",
+                     "no name server has an answer for '" + host + "': " + resolution.errorText,
                      kNoServerRemedy);
   }
   if (resolution.addresses.empty()) {

@@ -29,7 +29,7 @@ Resolution ResolveUntil(const Resolver& resolver, const std::string& host, int p
                         TimeLimit::Clock::time_point end);
 
 /// What the answer means.
-Finding JudgeResolution(const std::string& host, const Resolution& resolution);
+Finding FindingOfResolution(const std::string& host, const Resolution& resolution);
 
 }  // namespace SsoClient::Tool::Doctor
 

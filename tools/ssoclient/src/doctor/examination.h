@@ -9,6 +9,7 @@
 #include <vector>
 
 #include <ssoclient/holder_of_key_config.h>
+#include <ssoclient/negotiation_handler.h>
 #include <ssoclient/saml_token.h>
 #include <tarnik/core/ref.h>
 #include <tarnik/crypto/certificate.h>
@@ -36,10 +37,7 @@ struct Plan {
   std::string certificateFile{};
   /// May be that of the certificate; empty if the key is not in a file.
   std::string keyFile{};
-  std::string kerberosService{};
-  std::string principal{};
-  std::string credentialCache{};
-  std::string keytab{};
+  std::string keytabFile{};
   std::chrono::milliseconds timeout{30000};
   LoginKind login = LoginKind::kNone;
   bool isHttpAllowed = false;  ///< for a login
@@ -47,9 +45,12 @@ struct Plan {
   std::function<Tarnik::Ref<Tarnik::Ssl::SSLContext>()> makeSslContext{};
   /// The password. May ask the user; throws `ToolException`.
   std::function<SecretText()> readPassword{};
-  /// The key and its certificate, whose files, and that of the passphrase, others may read only if
-  /// the argument is true. May ask the user for a passphrase; throws `ToolException`.
-  std::function<HolderOfKeyConfig(bool mayBeOpen)> loadIdentity{};
+  /// The key and its certificate. May ask the user for a passphrase; throws `ToolException`.
+  std::function<HolderOfKeyConfig()> loadIdentity{};
+  /// Throws `ToolException` when others can use the keytab.
+  std::function<void()> checkKeytab{};
+  /// The legs of a login by Kerberos to the service on `host`. Throws `ToolException`.
+  std::function<std::shared_ptr<NegotiationHandler>(const std::string& host)> makeKerberosHandler{};
 };
 
 /// The parts of the URL.

@@ -47,7 +47,7 @@ std::string_view NamespaceOf(const ElementNode& element, std::string_view code) 
   return element.LookupNamespace(prefix).value_or("");
 }
 
-Finding JudgeFault(const ElementNode& fault) {
+Finding FindingOfFault(const ElementNode& fault) {
   const ElementNode* codeElement = fault.FirstChildElement("faultcode");
   const ElementNode* textElement = fault.FirstChildElement("faultstring");
   const std::string code = TextOf(codeElement);
@@ -63,7 +63,7 @@ Finding JudgeFault(const ElementNode& fault) {
                  "check the path of the URL if logins fail");
 }
 
-Finding JudgeEnvelope(const ElementNode& root) {
+Finding FindingOfEnvelope(const ElementNode& root) {
   if (root.LocalName() != "Envelope") {
     return NotSts("the document is '" + Tarnik::ToDisplayText(root.LocalName(), kShownText) + "'");
   }
@@ -75,7 +75,7 @@ Finding JudgeEnvelope(const ElementNode& root) {
     return NotSts("the Envelope is not of SOAP 1.1");
   }
   if (const ElementNode* fault = body->FirstChildElement(kSoap, "Fault")) {
-    return JudgeFault(*fault);
+    return FindingOfFault(*fault);
   }
   const ElementNode* content = body->NextElement(body);
   if (content != nullptr && content->NamespaceUri() == kTrust) {
@@ -99,12 +99,13 @@ std::string HarmlessRequest(const Tarnik::System::DateTime& now) {
          "/Validate</t:RequestType></t:RequestSecurityToken></S:Body></S:Envelope>";
 }
 
-Finding JudgeSoapAnswer(const std::string& body) {
+Finding FindingOfSoapAnswer(const std::string& body) {
   try {
     const auto reader = Tarnik::CreateStringReader(body);
     const auto handler = Tarnik::Xml::CreateXMLDocumentHandler();
     const auto parsed = Tarnik::Xml::CreateXMLParser(reader.get(), handler.get())->Parse();
-    return JudgeEnvelope(*Tarnik::CheckedCast<Tarnik::Xml::Document>(parsed.get())->RootElement());
+    return FindingOfEnvelope(
+        *Tarnik::CheckedCast<Tarnik::Xml::Document>(parsed.get())->RootElement());
   } catch (const Tarnik::Exception& malformed) {
     return NotSts(std::string("it is not XML (") + malformed.what() + ")");
   }

@@ -19,7 +19,7 @@ inline constexpr const char* kHarmlessAction =
 std::string HarmlessRequest(const Tarnik::System::DateTime& now);
 
 /// What the body of the answer to that request says about the service.
-Finding JudgeSoapAnswer(const std::string& body);
+Finding FindingOfSoapAnswer(const std::string& body);
 
 }  // namespace SsoClient::Tool::Doctor
 

@@ -23,7 +23,7 @@ std::string BeginningOf(const HttpAnswer& answer) {
   return LowerCase(std::string_view(answer.body).substr(0, kBeginning));
 }
 
-Finding Unusable(const char* name, const std::string& message, const std::string& remedy) {
+Finding Unusable(FindingName name, const std::string& message, const std::string& remedy) {
   return Failure(ExitStatus::kUnreachable, name, message, remedy);
 }
 
@@ -63,7 +63,8 @@ Finding Redirected(const HttpAnswer& answer, const std::string& status) {
                                             "the login page of a network");
 }
 
-Finding JudgeStatus(const HttpAnswer& answer, const std::string& status, const std::string& path) {
+Finding FindingOfStatus(const HttpAnswer& answer, const std::string& status,
+                        const std::string& path) {
   switch (answer.status) {
     case 401:
       return Unusable("http-unauthorized", "HTTP itself asks for a login (" + status + ")",
@@ -104,7 +105,7 @@ bool IsHtml(const HttpAnswer& answer) {
          beginning.find("<html") != std::string::npos;
 }
 
-Finding JudgeHttp(const HttpAnswer& answer, const std::string& path) {
+Finding FindingOfHttp(const HttpAnswer& answer, const std::string& path) {
   const std::string status = "HTTP status " + std::to_string(answer.status) +
                              (answer.reason.empty() ? "" : " " + answer.reason);
   // The library reads faults only from 500 and successes, so other statuses are failures.
@@ -116,7 +117,7 @@ Finding JudgeHttp(const HttpAnswer& answer, const std::string& path) {
     return Redirected(answer, status);
   }
   if (!isRead || answer.status == 500) {
-    return JudgeStatus(answer, status, path);
+    return FindingOfStatus(answer, status, path);
   }
   if (IsHtml(answer)) {
     return Page(answer, status);

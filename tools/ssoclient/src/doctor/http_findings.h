@@ -15,7 +15,7 @@ bool LooksLikeSoap(const HttpAnswer& answer);
 bool IsHtml(const HttpAnswer& answer);
 
 /// What the answer means; `path` is the request target.
-Finding JudgeHttp(const HttpAnswer& answer, const std::string& path);
+Finding FindingOfHttp(const HttpAnswer& answer, const std::string& path);
 
 }  // namespace SsoClient::Tool::Doctor
 

@@ -6,8 +6,6 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include "input/private_file.h"
-
 namespace SsoClient::Tool::Doctor {
 namespace {
 
@@ -36,24 +34,6 @@ std::optional<Finding> FileProblem(const std::string& path) {
                    "let this user read the file");
   }
   return std::nullopt;
-}
-
-std::optional<Finding> PermissionProblem(const std::string& path) {
-  struct stat status {};
-  const bool isKnown = stat(path.c_str(), &status) == 0;
-  const Exposure exposure = isKnown ? ExposureOf(status, geteuid()) : Exposure::kNone;
-  if (exposure == Exposure::kNone) {
-    return std::nullopt;
-  }
-  if (exposure == Exposure::kByOwner) {
-    return Warning(ExitStatus::kLocal, "key-readable-by-others",
-                   Quoted(path) + ", which contains a key, belongs to another user",
-                   "use a file of your own; other commands refuse it without --allow-open-files");
-  }
-  return Warning(
-      ExitStatus::kLocal, "key-readable-by-others",
-      "the group or others may read or change " + Quoted(path) + ", which contains a key",
-      "chmod 600 " + path + "; other commands refuse it without --allow-open-files");
 }
 
 std::optional<Finding> ValidityProblem(const std::string& what,

@@ -13,8 +13,6 @@ namespace SsoClient::Tool::Doctor {
 
 /// Why the file cannot be read: missing, not permitted or not a file; nothing if it can.
 std::optional<Finding> FileProblem(const std::string& path);
-/// A warning if other users may read or change a file that contains a key.
-std::optional<Finding> PermissionProblem(const std::string& path);
 /// Whether the certificate is valid at `now`, or expires within 30 days; `what` begins the message.
 std::optional<Finding> ValidityProblem(const std::string& what,
                                        const Tarnik::Crypto::Certificate& certificate,

@@ -35,7 +35,7 @@ Finding OtherSigner(const LoginFacts& facts) {
 
 }  // namespace
 
-Finding JudgeLoginFailure(const std::exception& failure, const LoginFacts& facts) {
+Finding FindingOfLoginFailure(const std::exception& failure, const LoginFacts& facts) {
   const std::string message = TextWithout(facts.secret, failure.what());
   if (facts.isKerberos) {
     return Failure(
@@ -71,9 +71,8 @@ Finding JudgeLoginFailure(const std::exception& failure, const LoginFacts& facts
                    "look into the log of the service");
   }
   const Tool::Failure other = FailureOf(failure);
-  const bool isOwn = dynamic_cast<const ToolException*>(&failure) != nullptr;
   return Failure(
-      other.status, isOwn ? other.kind : "login-failed", message,
+      other.status, FindingName::FindOr(other.kind, "login-failed"), message,
       other.remedy.empty() ? "check the user name and the files of the login" : other.remedy);
 }
 

@@ -21,7 +21,7 @@ struct LoginFacts {
 };
 
 /// What a failed login means.
-Finding JudgeLoginFailure(const std::exception& failure, const LoginFacts& facts);
+Finding FindingOfLoginFailure(const std::exception& failure, const LoginFacts& facts);
 
 }  // namespace SsoClient::Tool::Doctor
 

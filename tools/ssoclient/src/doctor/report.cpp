@@ -33,12 +33,14 @@ Finding Fine(std::string message) {
   return {StepOutcome::kOk, ExitStatus::kDone, "ok", std::move(message), ""};
 }
 
-Finding Warning(ExitStatus status, std::string name, std::string message, std::string remedy) {
-  return {StepOutcome::kWarning, status, std::move(name), std::move(message), std::move(remedy)};
+Finding Warning(ExitStatus status, FindingName name, std::string message, std::string remedy) {
+  return {StepOutcome::kWarning, status, std::string(name.Text()), std::move(message),
+          std::move(remedy)};
 }
 
-Finding Failure(ExitStatus status, std::string name, std::string message, std::string remedy) {
-  return {StepOutcome::kFailed, status, std::move(name), std::move(message), std::move(remedy)};
+Finding Failure(ExitStatus status, FindingName name, std::string message, std::string remedy) {
+  return {StepOutcome::kFailed, status, std::string(name.Text()), std::move(message),
+          std::move(remedy)};
 }
 
 Finding Skipped(std::string message) {

@@ -7,6 +7,7 @@
 
 #include <nlohmann/json.hpp>
 
+#include "doctor/finding_name.h"
 #include "exit_status.h"
 
 namespace SsoClient::Tool::Doctor {
@@ -26,16 +27,16 @@ struct Finding {
   StepOutcome outcome = StepOutcome::kOk;
   /// The status of the program if this is the first cause.
   ExitStatus status = ExitStatus::kDone;
-  /// For programs: "ok", "skipped" when a step before it failed, "not-needed", or the name of the
-  /// problem, such as "unknown-host".
+  /// For programs: "ok", "skipped" when a step before it failed, "not-needed", or one of
+  /// `kFindingNames`.
   std::string name = "ok";
   std::string message{};  ///< one line for people
   std::string remedy{};   ///< what the user can do; empty without a problem
 };
 
 Finding Fine(std::string message);
-Finding Warning(ExitStatus status, std::string name, std::string message, std::string remedy);
-Finding Failure(ExitStatus status, std::string name, std::string message, std::string remedy);
+Finding Warning(ExitStatus status, FindingName name, std::string message, std::string remedy);
+Finding Failure(ExitStatus status, FindingName name, std::string message, std::string remedy);
 /// A step that could not run.
 Finding Skipped(std::string message);
 /// A step that does not apply; the steps after it run.

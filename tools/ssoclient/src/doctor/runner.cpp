@@ -63,9 +63,8 @@ Step RunStep(const Entry& entry, Examination& examination) {
     step = entry.examine(examination);
   } catch (const std::exception& exception) {
     const Tool::Failure failure = FailureOf(exception);
-    const bool isLocal = failure.kind == "local";
-    step.finding = Failure(failure.status, isLocal ? "local-failure" : failure.kind,
-                           failure.message, isLocal ? kLocalRemedy : failure.remedy);
+    step.finding = Failure(failure.status, "local-failure", failure.message,
+                           failure.remedy.empty() ? kLocalRemedy : failure.remedy);
   }
   step.duration =
       std::chrono::duration_cast<std::chrono::microseconds>(TimeLimit::Clock::now() - begin);

@@ -62,19 +62,13 @@ Step ExamineCertificate(Examination& examination) {
     step.finding = NotNeeded("the URL begins with http");
     return step;
   }
-  if (examination.tls.chain.empty()) {
-    step.finding =
-        Failure(ExitStatus::kUnreachable, "no-certificate", "the service has sent no certificate",
-                "configure the TLS certificate of the service");
-    return step;
-  }
   const Plan& plan = examination.plan;
   const ChainFacts facts =
       Verify(examination.tls.chain, {plan.caFiles, plan.crlFiles}, examination.ExpectedName());
   for (std::size_t i = 0; i < facts.links.size(); ++i) {
     Show(step, facts.links[i], i);
   }
-  step.finding = JudgeChain(facts, Tarnik::System::GetUtcDateTime());
+  step.finding = FindingOfChain(facts, Tarnik::System::GetUtcDateTime());
   Compare(step, AskLibrary(examination, examination.limit.ForStep()));
   return step;
 }

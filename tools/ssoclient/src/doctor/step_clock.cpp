@@ -18,7 +18,7 @@ Step ExamineClock(Examination& examination) {
   }
   const ClockOffset offset = OffsetOf(*date, answer.sentAt, answer.receivedAt);
   examination.clockOffset = offset.seconds;
-  step.finding = JudgeClock(offset);
+  step.finding = FindingOfClock(offset);
   step.details = {{"offsetSeconds", offset.seconds},
                   {"uncertaintySeconds", offset.uncertainty},
                   {"date", *answer.date}};

@@ -29,16 +29,16 @@ std::optional<Finding> CertificateProblem(const Plan& plan) {
 }
 
 // Asking for a passphrase takes no time of the examination.
-HolderOfKeyConfig Load(Examination& examination, bool isOpen) {
+HolderOfKeyConfig Load(Examination& examination) {
   const auto begin = TimeLimit::Clock::now();
-  HolderOfKeyConfig identity = examination.plan.loadIdentity(isOpen);
+  HolderOfKeyConfig identity = examination.plan.loadIdentity();
   examination.limit.Extend(TimeLimit::Clock::now() - begin);
   return identity;
 }
 
 Finding KeyProblem(const Tool::Failure& failure) {
   return Failure(
-      failure.status, failure.kind == "key" ? "bad-key-file" : failure.kind, failure.message,
+      failure.status, FindingName::FindOr(failure.kind, "bad-key-file"), failure.message,
       failure.remedy.empty() ? "give the key that the certificate was issued for" : failure.remedy);
 }
 
@@ -53,7 +53,7 @@ void Show(Step& step, const Certificate& certificate) {
 
 std::optional<Finding> FilesProblem(const Plan& plan) {
   for (const std::string& path : {plan.certificateFile, plan.keyFile}) {
-    const std::optional<Finding> problem = path.empty() ? std::nullopt : FileProblem(path);
+    std::optional<Finding> problem = path.empty() ? std::nullopt : FileProblem(path);
     if (problem) {
       return problem;
     }
@@ -68,9 +68,8 @@ Step ExamineIdentity(Examination& examination) {
     step.finding = *problem;
     return step;
   }
-  const auto permission = PermissionProblem(plan.keyFile);
   try {
-    examination.identity = Load(examination, permission.has_value());
+    examination.identity = Load(examination);
   } catch (const ToolException& exception) {
     step.finding = KeyProblem(exception.What());
     return step;
@@ -79,20 +78,24 @@ Step ExamineIdentity(Examination& examination) {
   Show(step, certificate);
   const auto validity = ValidityProblem("the certificate of the login", certificate,
                                         Tarnik::System::GetUtcDateTime());
-  step.finding = validity     ? *validity
-                 : permission ? *permission
-                              : Fine("the key belongs to the certificate");
+  step.finding = validity ? *validity : Fine("the key belongs to the certificate");
   return step;
 }
 
 Step ExamineKeytab(const Plan& plan) {
   Step step;
-  if (const auto problem = FileProblem(plan.keytab)) {
+  if (const auto problem = FileProblem(plan.keytabFile)) {
     step.finding = *problem;
-  } else if (const auto permission = PermissionProblem(plan.keytab)) {
-    step.finding = *permission;
-  } else {
+    return step;
+  }
+  try {
+    plan.checkKeytab();
     step.finding = Fine("the keytab can be read");
+  } catch (const ToolException& exception) {
+    const Tool::Failure& failure = exception.What();
+    step.finding = Failure(failure.status, FindingName::FindOr(failure.kind, "file-unreadable"),
+                           failure.message,
+                           failure.remedy.empty() ? "check the file of --keytab" : failure.remedy);
   }
   return step;
 }
@@ -106,8 +109,7 @@ Step ExamineCredentials(Examination& examination) {
     case LoginKind::kCertificate:
       return ExamineIdentity(examination);
     case LoginKind::kKerberos:
-      // Other forms than a path are names that only the Kerberos library can resolve.
-      if (!plan.keytab.empty() && plan.keytab.find(':') == std::string::npos) {
+      if (!plan.keytabFile.empty()) {
         return ExamineKeytab(plan);
       }
       step.finding = NotNeeded("the Kerberos library finds the tickets when it logs in");

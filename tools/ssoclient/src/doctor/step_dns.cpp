@@ -8,7 +8,7 @@ Step ExamineDns(Examination& examination) {
   const Target& target = examination.target;
   Resolution resolution =
       ResolveUntil(ResolveBySystem, target.host, target.port, examination.limit.ForStep());
-  step.finding = JudgeResolution(target.host, resolution);
+  step.finding = FindingOfResolution(target.host, resolution);
   step.details["host"] = target.host;
   step.details["addresses"] = nlohmann::json::array();
   for (const Address& address : resolution.addresses) {

@@ -60,7 +60,7 @@ HttpAnswer Exchange(const Examination& examination, TimeLimit::Clock::time_point
   return answer;
 }
 
-Finding Unanswered(const char* name, const std::string& message, const char* remedy) {
+Finding Unanswered(FindingName name, const std::string& message, const char* remedy) {
   return Failure(ExitStatus::kUnreachable, name, message, remedy);
 }
 
@@ -70,7 +70,7 @@ Finding CertificateRequired(const std::string& message) {
                     "use a port of the service that requires none");
 }
 
-Finding JudgeTlsFailure(const Examination& examination, const std::string& message) {
+Finding FindingOfTlsFailure(const Examination& examination, const std::string& message) {
   if (examination.tls.asksForCertificate) {
     return CertificateRequired(message);
   }
@@ -85,7 +85,7 @@ bool SpeaksTls(const Examination& examination) {
                                             .isDone;
 }
 
-Finding JudgeFailure(const Examination& examination, const Tarnik::Exception& failure) {
+Finding FindingOfFailure(const Examination& examination, const Tarnik::Exception& failure) {
   const std::string message = failure.what();
   if (SpeaksTls(examination)) {
     return Unanswered("https-on-http-port",
@@ -106,7 +106,7 @@ Finding JudgeFailure(const Examination& examination, const Tarnik::Exception& fa
                       "check the port of the URL: another service may answer there");
   }
   if (dynamic_cast<const Tarnik::Ssl::SSLException*>(&failure) != nullptr) {
-    return JudgeTlsFailure(examination, message);
+    return FindingOfTlsFailure(examination, message);
   }
   // TLS 1.3 refuses a client after the handshake, and the alert may be lost with the connection.
   if (examination.tls.asksForCertificate) {
@@ -123,11 +123,11 @@ Step ExamineHttp(Examination& examination) {
   try {
     examination.answer = Exchange(examination, examination.limit.ForStep());
   } catch (const Tarnik::IOException& failure) {
-    step.finding = JudgeFailure(examination, failure);
+    step.finding = FindingOfFailure(examination, failure);
     return step;
   }
   const HttpAnswer& answer = *examination.answer;
-  step.finding = JudgeHttp(answer, examination.target.path);
+  step.finding = FindingOfHttp(answer, examination.target.path);
   step.details = {{"httpStatus", answer.status}, {"path", examination.target.path}};
   const std::pair<const char*, const std::string*> fields[] = {{"contentType", &answer.contentType},
                                                                {"location", &answer.location},

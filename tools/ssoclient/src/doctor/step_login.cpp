@@ -8,10 +8,6 @@
 
 #include <ssoclient/security_token_service.h>
 
-#ifdef SSOCLIENT_TOOL_HAS_GSSAPI
-#include <ssoclient/gssapi_negotiation_handler.h>
-#endif
-
 #include "doctor/login_findings.h"
 #include "doctor/login_parts.h"
 #include "doctor/steps.h"
@@ -133,21 +129,11 @@ class Login {
   }
 
   Operation ByKerberos() {
-#ifdef SSOCLIENT_TOOL_HAS_GSSAPI
-    const Plan& plan = examination_.plan;
-    GssapiNegotiationConfig kerberos;
-    kerberos.targetService =
-        plan.kerberosService.empty() ? "HTTP@" + examination_.target.host : plan.kerberosService;
-    kerberos.principal = plan.principal;
-    kerberos.keytab = plan.keytab;
-    kerberos.credentialCache = plan.credentialCache;
-    handler_ = std::make_shared<NotingHandler>(CreateGssapiNegotiationHandler(kerberos));
+    handler_ = std::make_shared<NotingHandler>(
+        examination_.plan.makeKerberosHandler(examination_.target.host));
     return [handler = handler_](const SecurityTokenService& service) {
       return service.AcquireTokenByGSS(MakeSpec(), *handler);
     };
-#else
-    throw SsoException("this build of the program has no Kerberos");
-#endif
   }
 
   Examination& examination_;
@@ -156,7 +142,8 @@ class Login {
   std::shared_ptr<SecretText> password_;
 };
 
-Finding JudgeSuccess(const Examination& examination, const std::vector<ClaimedSigner>& signers) {
+Finding FindingOfSuccess(const Examination& examination,
+                         const std::vector<ClaimedSigner>& signers) {
   if (!examination.signers.empty()) {
     return Fine("the service has issued a token, and its signature is verified");
   }
@@ -190,17 +177,17 @@ Step ExamineLogin(Examination& examination) {
     signers = login.Signers();
   } catch (const std::exception& failure) {
     signers = login.Signers();
-    step.finding = JudgeLoginFailure(failure, {.signers = signers,
-                                               .trusted = SubjectsOf(examination),
-                                               .secret = login.Password(),
-                                               .isKerberos = login.HasKerberosFailed()});
+    step.finding = FindingOfLoginFailure(failure, {.signers = signers,
+                                                   .trusted = SubjectsOf(examination),
+                                                   .secret = login.Password(),
+                                                   .isKerberos = login.HasKerberosFailed()});
   }
   for (const ClaimedSigner& signer : signers) {
     step.details["claimedSigners"].push_back(
         {{"subject", signer.subject}, {"fingerprint", signer.fingerprint}});
   }
   if (examination.token) {
-    step.finding = JudgeSuccess(examination, signers);
+    step.finding = FindingOfSuccess(examination, signers);
   }
   return step;
 }

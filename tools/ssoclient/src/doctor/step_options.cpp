@@ -9,7 +9,7 @@ namespace {
 constexpr int kHttpPort = 80;
 constexpr int kHttpsPort = 443;
 
-Finding JudgeUrl(const Plan& plan, const Target& target) {
+Finding FindingOfUrl(const Plan& plan, const Target& target) {
   if (!target.isHttps && target.port == kHttpsPort) {
     return Warning(ExitStatus::kUsage, "http-with-https-port",
                    "the URL begins with http, but 443 is the port of https",
@@ -43,7 +43,7 @@ Step ExamineOptions(Examination& examination) {
                            "write the URL as https://HOST[:PORT]/PATH");
     return step;
   }
-  step.finding = JudgeUrl(examination.plan, target);
+  step.finding = FindingOfUrl(examination.plan, target);
   step.details = {{"scheme", target.isHttps ? "https" : "http"},
                   {"host", target.host},
                   {"port", target.port},

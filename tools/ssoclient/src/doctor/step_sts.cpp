@@ -5,7 +5,7 @@ namespace SsoClient::Tool::Doctor {
 
 Step ExamineSts(Examination& examination) {
   Step step;
-  step.finding = JudgeSoapAnswer(examination.answer->body);
+  step.finding = FindingOfSoapAnswer(examination.answer->body);
   return step;
 }
 

@@ -26,7 +26,7 @@ Step ExamineTcp(Examination& examination) {
       examination.reachable = attempt.address;
     }
   }
-  step.finding = JudgeConnections(connections, examination.target.port);
+  step.finding = FindingOfConnections(connections, examination.target.port);
   return step;
 }
 

@@ -53,7 +53,7 @@ Step ExamineTls(Examination& examination) {
   if (!tls.isDone && tls.isConnected && !tls.isTimedOut) {
     AskFurther(examination, facts);
   }
-  step.finding = JudgeTls(facts, examination.target.port);
+  step.finding = FindingOfTls(facts, examination.target.port);
   if (tls.isDone) {
     step.details = {{"protocol", tls.protocol},
                     {"cipher", tls.cipher},

@@ -13,8 +13,9 @@ constexpr long kToleranceSec = 5;
 
 }  // namespace
 
-Finding JudgeValidity(const Tarnik::System::DateTime& start, const Tarnik::System::DateTime& end,
-                      const Tarnik::System::DateTime& now) {
+Finding FindingOfValidity(const Tarnik::System::DateTime& start,
+                          const Tarnik::System::DateTime& end,
+                          const Tarnik::System::DateTime& now) {
   const long untilStart = (start.GetUtcTime() - now.GetUtcTime()) / kMicrosecondsOfSecond;
   const long untilEnd = (end.GetUtcTime() - now.GetUtcTime()) / kMicrosecondsOfSecond;
   const char* remedy = "synchronise the clocks of this machine and the service";
@@ -40,8 +41,8 @@ Step ExamineToken(Examination& examination) {
     return step;
   }
   const SamlToken& token = *examination.token;
-  step.finding =
-      JudgeValidity(token.StartTime(), token.ExpirationTime(), Tarnik::System::GetUtcDateTime());
+  step.finding = FindingOfValidity(token.StartTime(), token.ExpirationTime(),
+                                   Tarnik::System::GetUtcDateTime());
   const std::string subject =
       Tarnik::ToDisplayText(token.Subject().name + "@" + token.Subject().domain, kShownSubject);
   const std::string issuer = Tarnik::ToDisplayText(token.Issuer(), kShownSubject);

@@ -35,7 +35,7 @@ void Note(Step& step, const std::optional<Finding>& problem) {
   }
 }
 
-Finding UnusableFile(const char* name, const std::string& path, const std::string& reason) {
+Finding UnusableFile(FindingName name, const std::string& path, const std::string& reason) {
   return Failure(ExitStatus::kLocal, name, "'" + path + "': " + reason,
                  "give a PEM file (DER is possible only for --sts-certificate)");
 }
@@ -120,7 +120,9 @@ Step ExamineTrust(Examination& examination) {
     examination.sslContext = plan.makeSslContext();
   } catch (const std::exception& unusable) {
     step.finding = Failure(ExitStatus::kLocal, "trust-unusable", unusable.what(),
-                           "check the files of --ca and --tls-crl");
+                           plan.caFiles.empty()
+                               ? "install the CAs of the system (ca-certificates), or give --ca"
+                               : "check the files of --ca and --tls-crl");
     return step;
   }
   if (step.finding.outcome == StepOutcome::kOk) {

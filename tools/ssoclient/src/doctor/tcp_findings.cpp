@@ -11,7 +11,7 @@ bool IsNoRoute(int error) {
   return error == ENETUNREACH || error == EADDRNOTAVAIL;
 }
 
-Finding JudgeFailure(const Connection& first, bool isOnlyIpv6, int port) {
+Finding FindingOfFailure(const Connection& first, bool isOnlyIpv6, int port) {
   const std::string where = "port " + std::to_string(port);
   if (IsNoRoute(first.error) && isOnlyIpv6) {
     return Failure(ExitStatus::kUnreachable, "only-ipv6",
@@ -47,18 +47,18 @@ Finding JudgeFailure(const Connection& first, bool isOnlyIpv6, int port) {
 
 }  // namespace
 
-Finding JudgeConnections(const std::vector<Connection>& connections, int port) {
+Finding FindingOfConnections(const std::vector<Connection>& connections, int port) {
   const auto connected = std::count_if(connections.begin(), connections.end(),
                                        [](const Connection& each) { return each.error == 0; });
   if (connected == 0) {
     const bool isOnlyIpv6 = std::all_of(connections.begin(), connections.end(),
                                         [](const Connection& each) { return each.isIpv6; });
     // An error other than a missing route, which a machine without IPv6 always has, says more.
-    const auto telling =
+    const auto decisive =
         std::find_if(connections.begin(), connections.end(),
                      [](const Connection& each) { return !IsNoRoute(each.error); });
-    return JudgeFailure(telling != connections.end() ? *telling : connections.front(), isOnlyIpv6,
-                        port);
+    return FindingOfFailure(decisive != connections.end() ? *decisive : connections.front(),
+                            isOnlyIpv6, port);
   }
   const std::string count = std::to_string(connected) + " of " + std::to_string(connections.size());
   const bool hasProblem =

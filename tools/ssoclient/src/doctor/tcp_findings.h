@@ -14,7 +14,7 @@ struct Connection {
 };
 
 /// What the connections to all addresses, at least one, mean.
-Finding JudgeConnections(const std::vector<Connection>& connections, int port);
+Finding FindingOfConnections(const std::vector<Connection>& connections, int port);
 
 }  // namespace SsoClient::Tool::Doctor
 

@@ -55,7 +55,7 @@ Finding Refused(const TlsFacts& facts, const std::string& where) {
 
 }  // namespace
 
-Finding JudgeTls(const TlsFacts& facts, int port) {
+Finding FindingOfTls(const TlsFacts& facts, int port) {
   const std::string where = "port " + std::to_string(port);
   if (!facts.protocol.empty()) {
     return Fine(facts.protocol + " with " + facts.cipher);

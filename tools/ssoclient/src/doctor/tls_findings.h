@@ -24,7 +24,7 @@ struct TlsFacts {
 };
 
 /// What that means.
-Finding JudgeTls(const TlsFacts& facts, int port);
+Finding FindingOfTls(const TlsFacts& facts, int port);
 
 /// The name of an alert (RFC 8446, section 6), such as "protocol_version", or its number.
 std::string AlertName(int alert);

@@ -8,8 +8,8 @@
 namespace SsoClient::Tool::Doctor {
 
 /// Whether a token of this validity can be used at `now` by a service that tolerates nothing.
-Finding JudgeValidity(const Tarnik::System::DateTime& start, const Tarnik::System::DateTime& end,
-                      const Tarnik::System::DateTime& now);
+Finding FindingOfValidity(const Tarnik::System::DateTime& start,
+                          const Tarnik::System::DateTime& end, const Tarnik::System::DateTime& now);
 
 }  // namespace SsoClient::Tool::Doctor
 

@@ -8,6 +8,7 @@
 #include <ssoclient/exceptions.h>
 #include <tarnik/text/display_text.h>
 
+#include "service/clock_offset.h"
 #include "service/secret_search.h"
 
 namespace SsoClient::Tool {
@@ -19,7 +20,6 @@ using Access::FailureKind;
 constexpr std::string_view kUnexpectedFault = "Unexpected SOAP fault: ";
 
 constexpr std::size_t kMaxMessageBytes = 1000;
-constexpr long kLargeOffsetSec = 30;
 constexpr int kUnauthorized = 401;
 constexpr int kInternalServerError = 500;
 
@@ -78,7 +78,8 @@ Failure FailureOfCall(const Tarnik::Exception& exception, const ExchangeNotes& n
       MakeFailure(kind, ContainsSecret(exception.what(), secret)
                             ? "the service's text is not shown, since it contains the password"
                             : message);
-  const bool isOff = notes.clockOffsetSec && std::labs(*notes.clockOffsetSec) > kLargeOffsetSec;
+  const bool isOff =
+      notes.clockOffsetSec && std::labs(*notes.clockOffsetSec) > kLargeClockOffsetSec;
   if (failure.status == ExitStatus::kRefused && isOff) {
     failure.remedy = ClockText(*notes.clockOffsetSec);
   }

@@ -12,8 +12,8 @@ namespace SsoClient::Tool {
 
 /// The failure that an exception of an operation of the client means, with the exact kind. If the
 /// service's text contains `secret`, it is left out; `secret` may be empty for none. When the
-/// service has refused the request and the clocks differ by more than 30 seconds, the remedy says
-/// so.
+/// service has refused the request and the clocks differ by more than `kLargeClockOffsetSec`, the
+/// remedy says so.
 Failure FailureOfCall(const Tarnik::Exception& exception, const ExchangeNotes& notes,
                       std::string_view secret);
 

@@ -1,16 +1,14 @@
 #include <filesystem>
-#include <memory>
 #include <string>
 #include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
-#include <stdlib.h>
+
 #include <sys/stat.h>
 
-#include <devsts/kerberos_realm.h>
-
+#include "support/kerberos_service.h"
 #include "support/service_fixture.h"
 
 namespace SsoClient::Tool::Testing {
@@ -19,29 +17,6 @@ namespace {
 using testing::HasSubstr;
 
 constexpr const char* kService = "HTTP@sts.example";
-
-struct Kerberos {
-  Kerberos() {
-    // Read by the dev STS, in this process, when it begins to accept tickets.
-    setenv("KRB5_CONFIG", realm.ConfigPath().c_str(), 1);
-    realm.AddUser("alice", "alice-secret");
-    aliceCache = realm.Login("alice", "alice-secret");
-    machineKeytab = realm.AddKeytab("machine");
-    DevSts::ServerOptions options;
-    options.negotiation.keytab = realm.AddKeytab("HTTP/sts.example");
-    sts = std::make_unique<DevSts::Server>(options);
-  }
-
-  DevSts::KerberosRealm realm;
-  std::string aliceCache;
-  std::string machineKeytab;
-  std::unique_ptr<DevSts::Server> sts;
-};
-
-Kerberos& TheKerberos() {
-  static Kerberos kerberos;
-  return kerberos;
-}
 
 class KerberosLoginTest : public ServiceTest {
  protected:

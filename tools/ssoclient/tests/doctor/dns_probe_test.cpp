@@ -14,9 +14,8 @@ std::string FindingOf(int error) {
   Resolution resolution;
   resolution.error = error;
   resolution.errorText = "text";
-  const Finding finding = JudgeResolution("sts.example", resolution);
+  const Finding finding = FindingOfResolution("sts.example", resolution);
   EXPECT_EQ(finding.outcome, StepOutcome::kFailed);
-  EXPECT_EQ(finding.status, ExitStatus::kUnreachable);
   EXPECT_NE(finding.remedy, "");
   EXPECT_NE(finding.message.find("sts.example"), std::string::npos);
   return finding.name;
@@ -25,8 +24,9 @@ std::string FindingOf(int error) {
 TEST(DnsProbeTest, EachErrorOfTheResolverHasItsFinding) {
   EXPECT_EQ(FindingOf(EAI_NONAME), "unknown-host");
   EXPECT_EQ(FindingOf(EAI_AGAIN), "no-name-server");
-  EXPECT_EQ(FindingOf(EAI_FAIL), "dns-failed");
-  EXPECT_EQ(FindingOf(EAI_SYSTEM), "dns-failed");
+  EXPECT_EQ(FindingOf(EAI_FAIL), "no-name-server");
+  EXPECT_EQ(FindingOf(EAI_SYSTEM), "local-failure");
+  EXPECT_EQ(FindingOf(EAI_MEMORY), "local-failure");
   EXPECT_EQ(FindingOf(0), "unknown-host");  // no error and no address
 }
 
@@ -38,7 +38,7 @@ TEST(DnsProbeTest, AddressesAreResolvedWithoutAServer) {
   const Resolution six = ResolveBySystem("::1", 443);
   ASSERT_EQ(six.addresses.size(), 1U);
   EXPECT_TRUE(six.addresses.front().IsIpv6());
-  EXPECT_EQ(JudgeResolution("::1", six).message, "0 IPv4 and 1 IPv6 address(es)");
+  EXPECT_EQ(FindingOfResolution("::1", six).message, "0 IPv4 and 1 IPv6 address(es)");
 }
 
 TEST(DnsProbeTest, AResolverThatDoesNotAnswerIsLeftToItself) {
@@ -52,7 +52,7 @@ TEST(DnsProbeTest, AResolverThatDoesNotAnswerIsLeftToItself) {
   const Resolution resolution = ResolveUntil(
       hanging, "sts.example", 443, TimeLimit::Clock::now() + std::chrono::milliseconds(20));
   EXPECT_TRUE(resolution.isTimedOut);
-  EXPECT_EQ(JudgeResolution("sts.example", resolution).name, "dns-timed-out");
+  EXPECT_EQ(FindingOfResolution("sts.example", resolution).name, "dns-timed-out");
   release.set_value();
   ended.get_future().wait();
 }

@@ -12,6 +12,7 @@
 #include "support/doctor_run.h"
 #include "support/peer.h"
 #include "support/temporary_file.h"
+#include "support/test_pki.h"
 
 namespace SsoClient::Tool::Testing {
 namespace {
@@ -19,6 +20,8 @@ namespace {
 using DevSts::CertificateSpec;
 using DevSts::Credential;
 using DevSts::ServerCertificate;
+using Tarnik::Testing::Identity;
+using Tarnik::Testing::IdentityOptions;
 using Tarnik::Testing::TemporaryFile;
 using testing::HasSubstr;
 using testing::StartsWith;
@@ -108,9 +111,9 @@ TEST(DoctorCertificateTest, TheCaThatIsNeededIsNamed) {
     ExpectFailure(run, "certificate", "unknown-ca", 3, "http");
     EXPECT_THAT(run.Message("certificate"), HasSubstr("CN=Needed root"));
   }
-  const DoctorRun alone = Examine(server, "", other.certificatePem);
-  ExpectFailure(alone, "certificate", "unknown-issuer", 3, "http");
-  EXPECT_THAT(alone.Message("certificate"), HasSubstr("CN=Intermediate"));
+  const DoctorRun single = Examine(server, "", other.certificatePem);
+  ExpectFailure(single, "certificate", "unknown-issuer", 3, "http");
+  EXPECT_THAT(single.Message("certificate"), HasSubstr("CN=Intermediate"));
 }
 
 TEST(DoctorCertificateTest, ACaWithANewKeyIsFound) {
@@ -129,6 +132,16 @@ TEST(DoctorCertificateTest, ACertificateThatExpiresSoonIsAWarning) {
   EXPECT_EQ(run.Finding("certificate"), "expires-soon");
   EXPECT_THAT(run.Message("certificate"), HasSubstr("in 10 days"));
   EXPECT_NE(run.Outcome("http"), "skipped");
+}
+
+TEST(DoctorCertificateTest, ACertificateForClientsIsNotTrusted) {
+  const Identity root = Tarnik::Testing::MakeCa("Root");
+  IdentityOptions forClients{.dnsNames = {}, .addresses = {"127.0.0.1"}};
+  forClients.extendedKeyUsage = "clientAuth";
+  const Identity client = Tarnik::Testing::MakeIdentity(forClients, &root);
+  const DoctorRun run = Examine({client.Pem(), client.KeyPem()}, "", root.Pem());
+  ExpectFailure(run, "certificate", "not-trusted", 3, "http");
+  EXPECT_EQ(run.Detail("certificate", "/isAcceptedByLibrary"), "false");
 }
 
 TEST(DoctorCertificateTest, ThePeerNameReplacesTheHost) {

@@ -32,11 +32,10 @@ Credential Make(long fromDays, long toDays, bool freshKey = false) {
   return DevSts::MakeCertificate(spec);
 }
 
-DoctorRun RunIdentity(const std::string& certificate, const std::string& key,
-                      unsigned mode = 0600) {
+DoctorRun RunIdentity(const std::string& certificate, const std::string& key) {
   const TemporaryFile certificateFile(certificate);
   const TemporaryFile keyFile(key);
-  chmod(keyFile.Path().c_str(), mode);
+  chmod(keyFile.Path().c_str(), S_IRUSR | S_IWUSR);
   return RunDoctor(kUrl, {"--certificate", certificateFile.Path(), "--key", keyFile.Path()});
 }
 
@@ -115,12 +114,6 @@ TEST(DoctorFilesTest, TheValidityOfTheLoginsCertificateIsExamined) {
                 "local-certificate-not-yet-valid", "failed");
   ExpectFinding(RunIdentity(soon.certificatePem, soon.privateKeyPem), "credentials",
                 "local-certificate-expires-soon", "warning");
-}
-
-TEST(DoctorFilesTest, AKeyThatOthersCanReadIsAWarning) {
-  const Credential one = Make(-1, 90);
-  ExpectFinding(RunIdentity(one.certificatePem, one.privateKeyPem, 0644), "credentials",
-                "key-readable-by-others", "warning");
 }
 
 TEST(DoctorFilesTest, OptionsThatExcludeEachOtherAreWrong) {

@@ -8,9 +8,12 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <tarnik/system/date_time.h>
+
 #include "devsts/kerberos_realm.h"
 #include "devsts/server.h"
 #include "support/doctor_run.h"
+#include "support/kerberos_service.h"
 #include "support/peer.h"
 #include "support/temporary_file.h"
 
@@ -22,6 +25,19 @@ using Tarnik::Testing::TemporaryFile;
 using testing::EndsWith;
 using testing::HasSubstr;
 using testing::Not;
+
+// Lets the periods of validity of the assertion end in `seconds` from now.
+void ReplaceEnds(std::string& assertion, long seconds) {
+  constexpr long kMicroseconds = 1000000;
+  const long now = Tarnik::System::GetUtcDateTime().GetUtcTime();
+  const auto end = Tarnik::System::DateTimeFromUtc(now + seconds * kMicroseconds, false);
+  const std::string name = "NotOnOrAfter=\"";
+  for (std::size_t at = assertion.find(name); at != std::string::npos;
+       at = assertion.find(name, at + 1)) {
+    const std::size_t begin = at + name.size();
+    assertion.replace(begin, assertion.find('"', begin) - begin, end.ToString());
+  }
+}
 
 class DoctorLoginTest : public testing::Test {
  protected:
@@ -148,6 +164,16 @@ TEST_F(DoctorLoginTest, ATokenThatBeginsLaterIsAWarning) {
   EXPECT_EQ(run.Finding("token"), "token-not-yet-valid");
 }
 
+TEST_F(DoctorLoginTest, ATokenThatHasExpiredIsAWarning) {
+  DevSts::AssertionOptions early;
+  early.notBeforeOffset = std::chrono::seconds(300);
+  early.beforeSigning = [](std::string& assertion) { ReplaceEnds(assertion, -100); };
+  sts.SetAssertionOptions(early);
+  const DoctorRun run = RunAlice();
+  EXPECT_EQ(run.Status(), 0) << run.Text();
+  EXPECT_EQ(run.FirstCause(), "token-already-expired");
+}
+
 TEST_F(DoctorLoginTest, AnAnswerThatEndsDuringTheLoginIsFound) {
   sts.MisbehaveNext({});
   Misbehavior cut;
@@ -196,6 +222,39 @@ TEST_F(DoctorLoginTest, ACertificateLogsIn) {
   EXPECT_EQ(run.Status(), 0) << run.Text();
   EXPECT_EQ(run.Finding("credentials"), "ok");
   EXPECT_EQ(run.Detail("token", "/subject"), "\"bob@EXAMPLE.COM\"");
+}
+
+TEST_F(DoctorLoginTest, KerberosLogsInWithTicketsOrAKeytab) {
+  const Kerberos& kerberos = TheKerberos();
+  const TemporaryFile ofRealm(kerberos.sts->CaCertificatePem());
+  const TemporaryFile signerOfRealm(kerberos.sts->SigningCertificatePem());
+  ToolOptions options;
+  options.environment = {{"KRB5_CONFIG", kerberos.realm.ConfigPath()},
+                         {"KRB5CCNAME", "FILE:/nonexistent/cache"}};
+  const auto run = [&](const std::string& option, const std::string& value) {
+    options.arguments = {"doctor",
+                         "--json",
+                         "--url",
+                         kerberos.sts->HttpsUrl(),
+                         "--ca",
+                         ofRealm.Path(),
+                         "--sts-certificate",
+                         signerOfRealm.Path(),
+                         "--kerberos",
+                         "--service",
+                         "HTTP@sts.example",
+                         option,
+                         value};
+    return DoctorRun(options);
+  };
+  const DoctorRun byTickets = run("--ccache", kerberos.aliceCache);
+  EXPECT_EQ(byTickets.Status(), 0) << byTickets.Text();
+  EXPECT_EQ(byTickets.Finding("login"), "ok");
+  EXPECT_EQ(byTickets.Detail("token", "/subject"), "\"alice@EXAMPLE.COM\"");
+  const DoctorRun byKeytab = run("--keytab", kerberos.machineKeytab);
+  EXPECT_EQ(byKeytab.Status(), 0) << byKeytab.Text();
+  EXPECT_EQ(byKeytab.Finding("credentials"), "ok");
+  EXPECT_EQ(byKeytab.Detail("token", "/subject"), "\"machine@EXAMPLE.COM\"");
 }
 
 TEST_F(DoctorLoginTest, KerberosWithoutTicketsIsFound) {

@@ -1,19 +1,21 @@
 // Findings about what a port speaks, each produced for real.
+#include <atomic>
 #include <string>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/socket.h>
 
-#include "devsts/certificates.h"
 #include "devsts/server.h"
 #include "support/doctor_run.h"
 #include "support/peer.h"
 #include "support/temporary_file.h"
+#include "support/test_pki.h"
 
 namespace SsoClient::Tool::Testing {
 namespace {
 
+using Tarnik::Testing::Identity;
 using Tarnik::Testing::TemporaryFile;
 using testing::HasSubstr;
 
@@ -52,6 +54,30 @@ TEST(DoctorTlsTest, ASilentServiceTakesOnlyAThirdOfTheTime) {
 TEST(DoctorTlsTest, AServiceThatEndsConnectionsIsFound) {
   const Peer closing([](int) {});
   ExpectFailure(RunDoctor(closing.Url()), "tls", "tls-closed", 3, "certificate");
+}
+
+TEST(DoctorTlsTest, AServiceThatAcceptsOnlyOneConnectionIsFound) {
+  // The connection of the TCP step stays in the queue, which has room for one.
+  const ListeningSocket full(0);
+  ExpectFailure(RunDoctor(full.Url(), {"--timeout", "0.9"}), "tls", "tls-no-connection", 3,
+                "certificate");
+}
+
+TEST(DoctorTlsTest, AServiceWhoseTlsBreaksLaterIsFound) {
+  constexpr int kProbesAndTheLibrary = 3;
+  const Identity root = Tarnik::Testing::MakeCa("CA");
+  const Identity server = Tarnik::Testing::MakeIdentity(
+      {.dnsNames = {}, .addresses = {"127.0.0.1"}, .notAfter = 100L * 24 * 3600}, &root);
+  const TemporaryFile ca(root.Pem());
+  // A fatal alert (RFC 8446, section 6): internal_error.
+  const auto broken = Answering(std::string("\x15\x03\x03\x00\x02\x02\x50", 7));
+  const auto whole = TlsPeer(server.Pem(), server.KeyPem());
+  std::atomic<int> count = 0;
+  const Peer peer(
+      [&](int descriptor) { (++count <= kProbesAndTheLibrary ? whole : broken)(descriptor); });
+  const DoctorRun run = RunDoctor(peer.Url(), {"--ca", ca.Path()});
+  ExpectFailure(run, "http", "tls-broken", 3, "sts");
+  EXPECT_THAT(run.Message("http"), HasSubstr("internal_error"));
 }
 
 TEST(DoctorTlsTest, AServiceThatNeverStopsSendingIsFound) {

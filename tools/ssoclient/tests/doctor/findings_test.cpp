@@ -1,4 +1,4 @@
-// What cannot be produced on every machine: findings of the pure functions.
+// Findings of the pure functions, at their limits.
 #include <cerrno>
 
 #include <gtest/gtest.h>
@@ -17,27 +17,28 @@ namespace {
 using Tarnik::System::DateTime;
 
 TEST(TcpFindingsTest, OneAddressThatAcceptsIsEnough) {
-  EXPECT_EQ(JudgeConnections({{0, false}}, 443).name, "ok");
+  EXPECT_EQ(FindingOfConnections({{0, false}}, 443).name, "ok");
   // A machine without IPv6 always fails to reach these addresses.
-  EXPECT_EQ(JudgeConnections({{ENETUNREACH, true}, {0, false}}, 443).name, "ok");
-  const Finding some = JudgeConnections({{0, false}, {ECONNREFUSED, false}}, 443);
+  EXPECT_EQ(FindingOfConnections({{ENETUNREACH, true}, {0, false}}, 443).name, "ok");
+  const Finding some = FindingOfConnections({{0, false}, {ECONNREFUSED, false}}, 443);
   EXPECT_EQ(some.name, "some-addresses-fail");
   EXPECT_EQ(some.outcome, StepOutcome::kWarning);
 }
 
 TEST(TcpFindingsTest, TheErrorThatSaysMostCounts) {
-  EXPECT_EQ(JudgeConnections({{ENETUNREACH, true}, {ECONNREFUSED, false}}, 443).name, "refused");
-  EXPECT_EQ(JudgeConnections({{ENETUNREACH, true}, {ENETUNREACH, false}}, 443).name,
+  EXPECT_EQ(FindingOfConnections({{ENETUNREACH, true}, {ECONNREFUSED, false}}, 443).name,
+            "refused");
+  EXPECT_EQ(FindingOfConnections({{ENETUNREACH, true}, {ENETUNREACH, false}}, 443).name,
             "network-unreachable");
-  EXPECT_EQ(JudgeConnections({{ENETUNREACH, true}}, 443).name, "only-ipv6");
-  EXPECT_EQ(JudgeConnections({{EHOSTUNREACH, false}}, 443).name, "host-unreachable");
-  EXPECT_EQ(JudgeConnections({{EMFILE, false}}, 443).name, "tcp-failed");
+  EXPECT_EQ(FindingOfConnections({{ENETUNREACH, true}}, 443).name, "only-ipv6");
+  EXPECT_EQ(FindingOfConnections({{EHOSTUNREACH, false}}, 443).name, "host-unreachable");
+  EXPECT_EQ(FindingOfConnections({{EMFILE, false}}, 443).name, "tcp-failed");
 }
 
 TEST(TlsFindingsTest, ASecondConnectionThatIsRefusedIsFound) {
   TlsFacts facts;
   facts.isConnected = false;
-  EXPECT_EQ(JudgeTls(facts, 443).name, "tls-no-connection");
+  EXPECT_EQ(FindingOfTls(facts, 443).name, "tls-no-connection");
 }
 
 TEST(TlsFindingsTest, AlertsHaveTheirNames) {
@@ -52,7 +53,7 @@ std::string ChainFinding(int error, bool isSelfIssued = false) {
   link.isSelfIssued = isSelfIssued;
   facts.links = {link};
   facts.errors = {error};
-  return JudgeChain(facts, DateTime::Parse("2026-01-01T00:00:00Z")).name;
+  return FindingOfChain(facts, DateTime::Parse("2026-01-01T00:00:00Z")).name;
 }
 
 TEST(ChainFindingsTest, EachErrorOfTheVerificationHasItsFinding) {
@@ -70,8 +71,8 @@ TEST(ChainFindingsTest, ACertificateNeedsAttentionThirtyDaysBeforeItsEnd) {
   ChainLink link;
   link.notAfter = DateTime::Parse("2026-01-31T00:00:00Z");
   facts.links = {link};
-  EXPECT_EQ(JudgeChain(facts, DateTime::Parse("2026-01-01T00:00:00Z")).name, "ok");
-  EXPECT_EQ(JudgeChain(facts, DateTime::Parse("2026-01-01T00:00:01Z")).name, "expires-soon");
+  EXPECT_EQ(FindingOfChain(facts, DateTime::Parse("2026-01-01T00:00:00Z")).name, "ok");
+  EXPECT_EQ(FindingOfChain(facts, DateTime::Parse("2026-01-01T00:00:01Z")).name, "expires-soon");
 }
 
 TEST(ClockTest, TheMiddleOfTheRoundTripIsCompared) {
@@ -81,17 +82,17 @@ TEST(ClockTest, TheMiddleOfTheRoundTripIsCompared) {
 }
 
 TEST(ClockTest, OnlyACertainDifferenceIsAProblem) {
-  EXPECT_EQ(JudgeClock({61, 0.5}).name, "clock-off");
-  EXPECT_EQ(JudgeClock({61, 2}).name, "ok");
-  EXPECT_EQ(JudgeClock({-601, 0.5}).name, "clock-far-off");
-  EXPECT_EQ(JudgeClock({-601, 2}).name, "clock-off");
+  EXPECT_EQ(FindingOfClock({31, 0.5}).name, "clock-off");
+  EXPECT_EQ(FindingOfClock({31, 2}).name, "ok");
+  EXPECT_EQ(FindingOfClock({-601, 0.5}).name, "clock-far-off");
+  EXPECT_EQ(FindingOfClock({-601, 2}).name, "clock-off");
 }
 
 TEST(TokenFindingsTest, AValidityThatIsNotNowIsAWarning) {
   const DateTime start = DateTime::Parse("2026-01-01T00:00:00Z");
   const DateTime end = DateTime::Parse("2026-01-01T00:05:00Z");
   const auto name = [&](const char* now) {
-    return JudgeValidity(start, end, DateTime::Parse(now)).name;
+    return FindingOfValidity(start, end, DateTime::Parse(now)).name;
   };
   EXPECT_EQ(name("2025-12-31T23:59:56Z"), "ok");
   EXPECT_EQ(name("2025-12-31T23:59:54Z"), "token-not-yet-valid");
@@ -104,11 +105,11 @@ TEST(ReportTest, TheFirstFailureIsTheCauseAndElseTheFirstWarning) {
   report.steps.resize(3);
   EXPECT_EQ(FirstCause(report), nullptr);
   EXPECT_EQ(StatusOf(report, true), ExitStatus::kDone);
-  report.steps[0].finding = Warning(ExitStatus::kLocal, "a", "", "");
+  report.steps[0].finding = Warning(ExitStatus::kLocal, "expires-soon", "", "");
   EXPECT_EQ(FirstCause(report), &report.steps[0]);
   EXPECT_EQ(StatusOf(report, false), ExitStatus::kDone);
   EXPECT_EQ(StatusOf(report, true), ExitStatus::kLocal);
-  report.steps[2].finding = Failure(ExitStatus::kRefused, "b", "", "");
+  report.steps[2].finding = Failure(ExitStatus::kRefused, "login-refused", "", "");
   EXPECT_EQ(FirstCause(report), &report.steps[2]);
   EXPECT_EQ(StatusOf(report, false), ExitStatus::kRefused);
 }

@@ -11,9 +11,11 @@
 
 namespace SsoClient::Tool::Testing {
 
-/// A run of `ssoclient doctor --json`.
+/// A run of `ssoclient doctor --json`. Expects that docs/tool.md has each problem that is found, in
+/// its step, and with the status of the program if it is the first cause.
 class DoctorRun {
  public:
+  /// Throws `std::runtime_error` when it prints no JSON.
   explicit DoctorRun(const ToolOptions& options);
 
   int Status() const { return status_; }
@@ -32,6 +34,7 @@ class DoctorRun {
   const std::string& Text() const { return text_; }
 
  private:
+  void CompareWithPage(bool isStrict) const;
   const nlohmann::json& StepNamed(const std::string& step) const;
   std::string Member(const std::string& step, const char* name) const;
 
@@ -47,6 +50,9 @@ DoctorRun RunDoctor(const std::string& url, const std::vector<std::string>& argu
 /// the program ends with the status, and that `skipped`, if it is not empty, was skipped.
 void ExpectFailure(const DoctorRun& run, const std::string& step, const std::string& finding,
                    int status, const std::string& skipped);
+
+/// Expects that the step has this warning, with a remedy.
+void ExpectWarning(const DoctorRun& run, const std::string& step, const std::string& finding);
 
 }  // namespace SsoClient::Tool::Testing
 

@@ -1,0 +1,24 @@
+#ifndef SSOCLIENT_TOOL_TESTS_SUPPORT_FINDINGS_PAGE_H
+#define SSOCLIENT_TOOL_TESTS_SUPPORT_FINDINGS_PAGE_H
+
+#include <set>
+#include <string>
+#include <vector>
+
+namespace SsoClient::Tool::Testing {
+
+/// A finding of `doctor` as docs/tool.md describes it.
+struct DocumentedFinding {
+  std::string name{};
+  std::set<std::string> steps{};  ///< or "any"
+  std::set<int> statuses{};
+  bool mayBeWarning = false;
+};
+
+/// The rows of the table of findings; a row for several findings gives several. Throws
+/// `std::runtime_error` when the page has no such table.
+const std::vector<DocumentedFinding>& DocumentedFindings();
+
+}  // namespace SsoClient::Tool::Testing
+
+#endif
