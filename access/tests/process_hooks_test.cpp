@@ -20,6 +20,15 @@ namespace SsoClient::Access::Testing {
 
 namespace {
 
+std::atomic<bool> isCallerBlocked{false};
+
+// The functions of the program itself run at the end of exit, after those of atexit.
+__attribute__((destructor)) void WaitForTheCaller() {
+  while (isCallerBlocked) {
+    std::this_thread::yield();
+  }
+}
+
 class ProcessHooksTest : public SourceFixture {
  protected:
   // What a child writes to the descriptor that `body` gets, until it ends.
@@ -61,6 +70,12 @@ class ProcessHooksTest : public SourceFixture {
     });
   }
 
+  // The same, which nothing destroys when the process exits.
+  TokenSourceImpl& KeptWithPool() {
+    static const auto* const kept = new std::shared_ptr<TokenSourceImpl>(MakeWithPool());
+    return **kept;
+  }
+
   static void Write(int descriptor, const std::string& text) {
     EXPECT_EQ(write(descriptor, text.data(), text.size()), static_cast<ssize_t>(text.size()));
   }
@@ -92,13 +107,12 @@ TEST_F(ProcessHooksTest, EndOfTheProcessEndsTheCallsOfAllSources) {
 
 TEST_F(ProcessHooksTest, ExitWithCallsUnderWayReportsEachOnce) {
   EXPECT_EQ(OutputOfChild([this](int descriptor) {
-              static std::shared_ptr<TokenSourceImpl> kept;
-              kept = MakeWithPool();
+              TokenSourceImpl& kept = KeptWithPool();
               for (int i = 0; i < 3; ++i) {
-                kept->GetTokenAsync(SpecFor(std::to_string(i)), {},
-                                    [descriptor](const auto&, const Tarnik::Exception* failure) {
-                                      Write(descriptor, "[" + failure->Message() + "]");
-                                    });
+                kept.GetTokenAsync(SpecFor(std::to_string(i)), {},
+                                   [descriptor](const auto&, const Tarnik::Exception* failure) {
+                                     Write(descriptor, "[" + failure->Message() + "]");
+                                   });
               }
               std::exit(0);
             }),
@@ -126,24 +140,15 @@ TEST_F(ProcessHooksTest, SourcesShareTheWaitAtTheEnd) {
 
 TEST_F(ProcessHooksTest, ExitWakesABlockedCaller) {
   EXPECT_EQ(OutputOfChild([this](int descriptor) {
-              static std::shared_ptr<TokenSourceImpl> kept;
-              static std::atomic<bool> isBlocked{true};
-              // Destroyed after the handler has run, since it is registered before.
-              static const struct UntilWoken {
-                ~UntilWoken() {
-                  while (isBlocked) {
-                    std::this_thread::yield();
-                  }
-                }
-              } untilWoken;
-              kept = MakeWithPool();
-              std::thread([this, descriptor] {
+              isCallerBlocked = true;
+              TokenSourceImpl& kept = KeptWithPool();
+              std::thread([this, descriptor, &kept] {
                 try {
-                  kept->GetToken(spec, {});
+                  kept.GetToken(spec, {});
                 } catch (const CommunicationException& failure) {
                   Write(descriptor, failure.Message());
                 }
-                isBlocked = false;
+                isCallerBlocked = false;
               }).detach();
               while (scripts[0]->Count() == 0) {
                 std::this_thread::yield();

@@ -12,12 +12,18 @@ namespace {
 
 using Ssl::TlsErrorText;
 
+class TlsErrorTextTest : public testing::Test {
+ protected:
+  // OpenSSL has words for alerts only after it has loaded its texts.
+  TlsErrorTextTest() { OPENSSL_init_ssl(OPENSSL_INIT_LOAD_SSL_STRINGS, nullptr); }
+};
+
 unsigned long AlertError(int alert) {
   return ERR_PACK(ERR_LIB_SSL, 0, SSL_AD_REASON_OFFSET + alert);
 }
 
 // RFC 8446, section 6, and RFC 5246, section 7.2, for the numbers that TLS 1.3 no longer uses.
-TEST(TlsErrorTextTest, NamesTheAlertsOfThePeer) {
+TEST_F(TlsErrorTextTest, NamesTheAlertsOfThePeer) {
   for (const auto& [alert, name] : {
            std::pair{10, "unexpected_message"},
            std::pair{20, "bad_record_mac"},
@@ -54,13 +60,13 @@ TEST(TlsErrorTextTest, NamesTheAlertsOfThePeer) {
   }
 }
 
-TEST(TlsErrorTextTest, NumbersAnAlertWithoutAName) {
+TEST_F(TlsErrorTextTest, NumbersAnAlertWithoutAName) {
   for (const int alert : {0, 99, 255}) {
     EXPECT_EQ(TlsErrorText(AlertError(alert)), "the peer sent the alert " + std::to_string(alert));
   }
 }
 
-TEST(TlsErrorTextTest, IsOpenSslsReasonForOtherErrors) {
+TEST_F(TlsErrorTextTest, IsOpenSslsReasonForOtherErrors) {
   for (const int reason : {SSL_R_WRONG_VERSION_NUMBER, SSL_R_NO_CIPHERS_AVAILABLE}) {
     const unsigned long error = ERR_PACK(ERR_LIB_SSL, 0, reason);
     EXPECT_EQ(TlsErrorText(error), ERR_reason_error_string(error));
