@@ -40,6 +40,7 @@ bool IsOpen(const TcpAttempt& attempt) {
 // Waits for the attempts that are under way; false when the time is over.
 bool Await(std::vector<TcpAttempt>& attempts, Clock::time_point start, Clock::time_point end) {
   std::vector<pollfd> polled;
+  polled.reserve(attempts.size());
   for (const TcpAttempt& attempt : attempts) {
     // poll skips negative descriptors.
     polled.push_back({IsOpen(attempt) ? attempt.socket.Get() : -1, POLLOUT, 0});

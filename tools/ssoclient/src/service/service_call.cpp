@@ -5,6 +5,7 @@
 #include <atomic>
 #include <cerrno>
 #include <chrono>
+#include <cmath>
 #include <cstdint>
 #include <exception>
 #include <utility>
@@ -111,7 +112,7 @@ const char* TextOf(ExchangeStage stage) {
 std::string ProgressText(const Call& call, Clock::duration passed, double timeoutSec) {
   const auto seconds = std::chrono::duration_cast<std::chrono::seconds>(passed).count();
   return std::string("ssoclient: ") + TextOf(call.limit->Stage()) + " (" + std::to_string(seconds) +
-         " s of " + std::to_string(static_cast<long>(timeoutSec + 0.5)) + " s)";
+         " s of " + std::to_string(std::lround(timeoutSec)) + " s)";
 }
 
 // Waits until the call has ended, `signals` is readable (if it is not negative), or for `duration`.
