@@ -5,7 +5,6 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
-
 #include <sys/stat.h>
 
 #include "support/kerberos_service.h"
