@@ -5,6 +5,8 @@
 #include <ssoclient/exceptions.h>
 #include <tarnik/core/exception.h>
 
+#include "token_remedy.h"
+
 namespace SsoClient::Tool {
 namespace {
 
@@ -40,8 +42,6 @@ std::string RemedyFor(FailureKind kind) {
       return "run 'ssoclient doctor' with the same URL and CA";
     case FailureKind::kTimedOut:
       return "run 'ssoclient doctor', or allow more time with --timeout";
-    case FailureKind::kBadToken:
-      return "check the signing certificate of the service (--sts-certificate)";
     default:
       return "";
   }
@@ -60,12 +60,20 @@ Failure MakeFailure(FailureKind kind, std::string message) {
           RemedyFor(kind)};
 }
 
+Failure MakeFailure(FailureKind kind, std::string message, const Tarnik::Exception& cause) {
+  Failure failure = MakeFailure(kind, std::move(message));
+  if (kind == FailureKind::kBadToken) {
+    failure.remedy = TokenRemedy(cause);
+  }
+  return failure;
+}
+
 Failure FailureOf(const std::exception& exception) {
   if (const auto* own = dynamic_cast<const ToolException*>(&exception)) {
     return own->What();
   }
   if (const auto* known = dynamic_cast<const Tarnik::Exception*>(&exception)) {
-    return MakeFailure(Access::Classify(*known), known->what());
+    return MakeFailure(Access::Classify(*known), known->what(), *known);
   }
   return {ExitStatus::kLocal, "local", exception.what(), ""};
 }

@@ -6,6 +6,7 @@
 #include <string>
 
 #include <ssoclient/access/failure_kind.h>
+#include <tarnik/core/exception.h>
 
 #include "exit_status.h"
 #include "failure_kinds.h"
@@ -34,6 +35,8 @@ class ToolException : public std::runtime_error {
 
 /// A failure of the kind, with its status and its remedy.
 Failure MakeFailure(Access::FailureKind kind, std::string message);
+/// The same for an exception of the libraries. The remedy of `kBadToken` depends on it.
+Failure MakeFailure(Access::FailureKind kind, std::string message, const Tarnik::Exception& cause);
 
 /// The failure that an exception of this program or of the libraries means.
 Failure FailureOf(const std::exception& exception);

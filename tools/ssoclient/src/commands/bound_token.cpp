@@ -9,6 +9,7 @@
 #include "failure.h"
 #include "input/token_file.h"
 #include "token/unverified_token.h"
+#include "token_remedy.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -22,7 +23,9 @@ void Verify(const std::string& text, const Tarnik::Xml::Security::KeyInfoResolve
     throw ToolException({ExitStatus::kRefused, "bad-token",
                          "the token is not from this service: " +
                              Tarnik::ToDisplayText(failure.what(), kMaxMessageBytes),
-                         "check the file, and the signing certificate (--sts-certificate)"});
+                         IsAlgorithmUnsupported(failure)
+                             ? kAlgorithmRemedy
+                             : "check the file, and the signing certificate (--sts-certificate)"});
   }
 }
 

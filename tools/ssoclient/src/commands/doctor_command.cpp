@@ -1,6 +1,6 @@
-#include <cstddef>
+#include <chrono>
+#include <memory>
 #include <string>
-#include <string_view>
 #include <vector>
 
 #include <CLI/CLI.hpp>

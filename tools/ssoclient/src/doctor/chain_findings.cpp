@@ -5,11 +5,10 @@
 
 #include "doctor/chain.h"
 #include "doctor/local_files.h"
+#include "output/count_text.h"
 
 namespace SsoClient::Tool::Doctor {
 namespace {
-
-constexpr const char* kRenewRemedy = "have the certificate of the service renewed";
 
 bool HasAny(const ChainFacts& facts, std::initializer_list<int> errors) {
   return std::any_of(errors.begin(), errors.end(),
@@ -18,6 +17,16 @@ bool HasAny(const ChainFacts& facts, std::initializer_list<int> errors) {
 
 Finding Untrusted(FindingName name, std::string message, std::string remedy) {
   return Failure(ExitStatus::kUnreachable, name, std::move(message), std::move(remedy));
+}
+
+// `link` is one of the links.
+std::string RenewalRemedy(const ChainFacts& facts, const ChainLink& link) {
+  if (&link == &facts.links.front()) {
+    return "have the certificate of the service renewed";
+  }
+  return link.isSelfIssued
+             ? "get the next certificate of the CA from a trusted source, and give it as --ca too"
+             : "get the next certificate of the CA, and let the service send it";
 }
 
 Finding UnknownIssuer(const ChainFacts& facts) {
@@ -72,7 +81,7 @@ Finding OutOfDate(const ChainFacts& facts, const Tarnik::System::DateTime& now) 
       return Untrusted("expired",
                        "the certificate of " + link.subject + " has expired on " +
                            link.notAfter.ToString() + "; it is now " + now.ToString(),
-                       std::string(kRenewRemedy) + ", unless the clock of this machine is wrong");
+                       RenewalRemedy(facts, link) + ", unless the clock of this machine is wrong");
     }
     if (link.notBefore > now) {
       return Untrusted("not-yet-valid",
@@ -124,9 +133,9 @@ Finding FindingOfChain(const ChainFacts& facts, const Tarnik::System::DateTime& 
     const long days = DaysUntil(link.notAfter, now);
     if (days < kSoonDays) {
       return Warning(ExitStatus::kUnreachable, "expires-soon",
-                     "the certificate of " + link.subject + " expires in " + std::to_string(days) +
-                         " days, on " + link.notAfter.ToString(),
-                     kRenewRemedy);
+                     "the certificate of " + link.subject + " expires in " +
+                         CountText(days, "day") + ", on " + link.notAfter.ToString(),
+                     RenewalRemedy(facts, link));
     }
   }
   return Fine("trusted for " + facts.expectedName + ", valid until " +

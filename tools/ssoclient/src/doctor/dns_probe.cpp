@@ -11,6 +11,8 @@
 
 #include <netdb.h>
 
+#include "output/count_text.h"
+
 namespace SsoClient::Tool::Doctor {
 namespace {
 
@@ -34,9 +36,9 @@ Address ToAddress(const addrinfo& info) {
   return address;
 }
 
-std::size_t CountIpv6(const std::vector<Address>& addresses) {
-  return static_cast<std::size_t>(std::count_if(addresses.begin(), addresses.end(),
-                                                [](const Address& each) { return each.IsIpv6(); }));
+long CountIpv6(const std::vector<Address>& addresses) {
+  return std::count_if(addresses.begin(), addresses.end(),
+                       [](const Address& each) { return each.IsIpv6(); });
 }
 
 }  // namespace
@@ -111,9 +113,10 @@ Finding FindingOfResolution(const std::string& host, const Resolution& resolutio
     return Failure(ExitStatus::kUnreachable, "unknown-host", "'" + host + "' has no address",
                    kUnknownRemedy);
   }
-  const std::size_t ipv6 = CountIpv6(resolution.addresses);
-  return Fine(std::to_string(resolution.addresses.size() - ipv6) + " IPv4 and " +
-              std::to_string(ipv6) + " IPv6 address(es)");
+  const long ipv6 = CountIpv6(resolution.addresses);
+  const long ipv4 = static_cast<long>(resolution.addresses.size()) - ipv6;
+  return Fine(CountText(ipv4, "IPv4 address", "es") + " and " +
+              CountText(ipv6, "IPv6 address", "es"));
 }
 
 }  // namespace SsoClient::Tool::Doctor

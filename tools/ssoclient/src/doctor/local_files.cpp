@@ -6,6 +6,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "output/count_text.h"
+
 namespace SsoClient::Tool::Doctor {
 namespace {
 
@@ -38,7 +40,8 @@ std::optional<Finding> FileProblem(const std::string& path) {
 
 std::optional<Finding> ValidityProblem(const std::string& what,
                                        const Tarnik::Crypto::Certificate& certificate,
-                                       const Tarnik::System::DateTime& now) {
+                                       const Tarnik::System::DateTime& now,
+                                       const std::string& soonRemedy) {
   if (certificate.NotAfter() <= now) {
     return Failure(ExitStatus::kLocal, "local-certificate-expired",
                    what + " has expired on " + certificate.NotAfter().ToString(),
@@ -52,9 +55,9 @@ std::optional<Finding> ValidityProblem(const std::string& what,
   }
   if (const long days = DaysUntil(certificate.NotAfter(), now); days < kSoonDays) {
     return Warning(ExitStatus::kLocal, "local-certificate-expires-soon",
-                   what + " expires in " + std::to_string(days) + " days, on " +
+                   what + " expires in " + CountText(days, "day") + ", on " +
                        certificate.NotAfter().ToString(),
-                   "have it renewed");
+                   soonRemedy);
   }
   return std::nullopt;
 }

@@ -14,9 +14,11 @@ namespace SsoClient::Tool::Doctor {
 /// Why the file cannot be read: missing, not permitted or not a file; nothing if it can.
 std::optional<Finding> FileProblem(const std::string& path);
 /// Whether the certificate is valid at `now`, or expires within 30 days; `what` begins the message.
+/// `soonRemedy` is what to do before it expires.
 std::optional<Finding> ValidityProblem(const std::string& what,
                                        const Tarnik::Crypto::Certificate& certificate,
-                                       const Tarnik::System::DateTime& now);
+                                       const Tarnik::System::DateTime& now,
+                                       const std::string& soonRemedy);
 
 /// How long a certificate must still be valid not to need attention.
 inline constexpr long kSoonDays = 30;

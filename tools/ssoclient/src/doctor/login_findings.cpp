@@ -6,6 +6,7 @@
 
 #include "failure.h"
 #include "service/secret_search.h"
+#include "token_remedy.h"
 
 namespace SsoClient::Tool::Doctor {
 namespace {
@@ -33,6 +34,17 @@ Finding OtherSigner(const LoginFacts& facts) {
                  "give it as --sts-certificate");
 }
 
+Finding UnacceptedToken(const InvalidTokenException& failure, const std::string& message,
+                        const LoginFacts& facts) {
+  const bool isSignature = dynamic_cast<const InvalidSignatureException*>(&failure) != nullptr;
+  if (isSignature && !IsAlgorithmUnsupported(failure)) {
+    return OtherSigner(facts);
+  }
+  return Failure(ExitStatus::kUnreachable, "token-rejected",
+                 "the service issued a token that is not accepted: " + message,
+                 TokenRemedy(failure));
+}
+
 }  // namespace
 
 Finding FindingOfLoginFailure(const std::exception& failure, const LoginFacts& facts) {
@@ -52,13 +64,8 @@ Finding FindingOfLoginFailure(const std::exception& failure, const LoginFacts& f
                    "check the user name, the password or the certificate, and whether the account "
                    "is locked");
   }
-  if (dynamic_cast<const InvalidSignatureException*>(&failure) != nullptr) {
-    return OtherSigner(facts);
-  }
-  if (dynamic_cast<const InvalidTokenException*>(&failure) != nullptr) {
-    return Failure(ExitStatus::kUnreachable, "token-rejected",
-                   "the service issued a token that is not accepted: " + message,
-                   "compare the clocks, and look into the log of the service");
+  if (const auto* token = dynamic_cast<const InvalidTokenException*>(&failure)) {
+    return UnacceptedToken(*token, message, facts);
   }
   if (dynamic_cast<const CommunicationException*>(&failure) != nullptr) {
     return Failure(ExitStatus::kUnreachable, "login-unanswered",

@@ -77,7 +77,7 @@ Step ExamineIdentity(Examination& examination) {
   const Certificate& certificate = *examination.identity->certificate;
   Show(step, certificate);
   const auto validity = ValidityProblem("the certificate of the login", certificate,
-                                        Tarnik::System::GetUtcDateTime());
+                                        Tarnik::System::GetUtcDateTime(), "have it renewed");
   step.finding = validity ? *validity : Fine("the key belongs to the certificate");
   return step;
 }

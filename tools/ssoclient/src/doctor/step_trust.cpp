@@ -7,6 +7,7 @@
 
 #include "doctor/local_files.h"
 #include "doctor/steps.h"
+#include "output/count_text.h"
 
 namespace SsoClient::Tool::Doctor {
 namespace {
@@ -50,7 +51,9 @@ void ExamineCa(Step& step, const std::string& path, const Tarnik::System::DateTi
     Show(step, "ca", certificates);
     for (const auto& certificate : certificates) {
       // A bundle may contain old certificates, and the service's chain decides whether it matters.
-      auto problem = ValidityProblem("the CA " + certificate->SubjectName(), *certificate, now);
+      auto problem = ValidityProblem("the CA " + certificate->SubjectName(), *certificate, now,
+                                     "get the next certificate of the CA from a trusted source, "
+                                     "and give it as --ca too");
       if (problem) {
         problem->outcome = StepOutcome::kWarning;
       }
@@ -87,7 +90,9 @@ void ExamineSigners(Step& step, Examination& examination, const std::string& pat
     Show(step, "signer", signers);
     for (const auto& signer : signers) {
       auto problem =
-          ValidityProblem("the signing certificate " + signer->SubjectName(), *signer, now);
+          ValidityProblem("the signing certificate " + signer->SubjectName(), *signer, now,
+                          "get the next signing certificate of the service from a trusted source, "
+                          "and give it as --sts-certificate too");
       if (problem) {
         problem->outcome = StepOutcome::kWarning;  // the library does not check its validity
       }
@@ -126,9 +131,10 @@ Step ExamineTrust(Examination& examination) {
     return step;
   }
   if (step.finding.outcome == StepOutcome::kOk) {
-    step.finding.message = plan.caFiles.empty()
-                               ? "the CAs of this system are trusted"
-                               : std::to_string(plan.caFiles.size()) + " CA file(s) trusted";
+    step.finding.message =
+        plan.caFiles.empty()
+            ? "the CAs of this system are trusted"
+            : CountText(static_cast<long>(plan.caFiles.size()), "CA file") + " trusted";
   }
   return step;
 }

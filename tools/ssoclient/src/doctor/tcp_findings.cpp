@@ -4,6 +4,8 @@
 #include <cerrno>
 #include <system_error>
 
+#include "output/count_text.h"
+
 namespace SsoClient::Tool::Doctor {
 namespace {
 
@@ -60,17 +62,18 @@ Finding FindingOfConnections(const std::vector<Connection>& connections, int por
     return FindingOfFailure(decisive != connections.end() ? *decisive : connections.front(),
                             isOnlyIpv6, port);
   }
-  const std::string count = std::to_string(connected) + " of " + std::to_string(connections.size());
+  const std::string message = "port " + std::to_string(port) + " accepts connections at " +
+                              std::to_string(connected) + " of " +
+                              CountText(static_cast<long>(connections.size()), "address", "es");
   const bool hasProblem =
       std::any_of(connections.begin(), connections.end(), [](const Connection& each) {
         return each.error != 0 && !(each.isIpv6 && IsNoRoute(each.error));
       });
   if (hasProblem) {
-    return Warning(ExitStatus::kUnreachable, "some-addresses-fail",
-                   count + " addresses accept connections",
+    return Warning(ExitStatus::kUnreachable, "some-addresses-fail", message,
                    "remove the other addresses from the DNS, or repair what they belong to");
   }
-  return Fine(count + " address(es) accept connections to port " + std::to_string(port));
+  return Fine(message);
 }
 
 }  // namespace SsoClient::Tool::Doctor

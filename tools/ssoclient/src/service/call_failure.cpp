@@ -75,9 +75,11 @@ Failure FailureOfCall(const Tarnik::Exception& exception, const ExchangeNotes& n
   const FailureKind kind = KindOf(exception, notes);
   const std::string message = Tarnik::ToDisplayText(exception.what(), kMaxMessageBytes);
   Failure failure =
-      MakeFailure(kind, ContainsSecret(exception.what(), secret)
-                            ? "the service's text is not shown, since it contains the password"
-                            : message);
+      MakeFailure(kind,
+                  ContainsSecret(exception.what(), secret)
+                      ? "the service's text is not shown, since it contains the password"
+                      : message,
+                  exception);
   const bool isOff =
       notes.clockOffsetSec && std::labs(*notes.clockOffsetSec) > kLargeClockOffsetSec;
   if (failure.status == ExitStatus::kRefused && isOff) {

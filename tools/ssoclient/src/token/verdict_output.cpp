@@ -52,6 +52,39 @@ void PrintLedger(const Console& console, const Access::Verdict& verdict) {
   table.Print(console);
 }
 
+// What a caller can do about a refusal with `Remedy::kNewToken`.
+std::string NeedOfCaller(Reason reason) {
+  switch (reason) {
+    case Reason::kNoProof:
+    case Reason::kWrongProof:
+      return "the caller must prove the key of this token, or needs another token";
+    case Reason::kTooLarge:
+      return "the caller needs a smaller token";
+    case Reason::kNotYetValid:
+      return "the caller must wait until the token is valid, or needs another token";
+    case Reason::kExpired:
+      return "the caller needs a token that has not expired";
+    case Reason::kUnknownIssuer:
+      return "the caller needs a token of an issuer that the service trusts";
+    case Reason::kUnknownSigner:
+    case Reason::kSignerNotYetValid:
+    case Reason::kSignerExpired:
+    case Reason::kSignerRevoked:
+      return "the caller needs a token that a current, trusted certificate has signed";
+    case Reason::kWrongAudience:
+    case Reason::kUnrestricted:
+      return "the caller needs a token for the audience of the service";
+    case Reason::kBearerRefused:
+      return "the caller needs a token that is bound to a key";
+    case Reason::kTooLongLived:
+      return "the caller needs a token with a shorter lifetime";
+    case Reason::kTooDeeplyDelegated:
+      return "the caller needs a token with fewer delegates";
+    default:
+      return "the caller needs another token";
+  }
+}
+
 bool IsAboutTime(Reason reason) {
   return reason == Reason::kExpired || reason == Reason::kNotYetValid;
 }
@@ -60,7 +93,7 @@ void PrintRefusal(const Console& console, const Access::Verdict& verdict, bool h
   const Reason reason = verdict.Refusal();
   console.out << console.Paint(Colour::kBad, "refused") << " (" << Access::NameOf(reason)
               << "): " << SafeText(console, verdict.Message()) << '\n'
-              << "  remedy: " << RemedyText(RemedyOf(reason)) << '\n';
+              << "  remedy: " << RemedyText(reason) << '\n';
   const std::string hint = OptionHint(reason);
   if (!hint.empty() && !(hasOwnTime && IsAboutTime(reason))) {
     console.out << "  hint: " << hint << '\n';
@@ -83,12 +116,12 @@ const char* NameOf(Remedy remedy) noexcept {
   return "unknown";
 }
 
-std::string RemedyText(Remedy remedy) {
-  switch (remedy) {
+std::string RemedyText(Reason reason) {
+  switch (RemedyOf(reason)) {
     case Remedy::kNone:
       return {};
     case Remedy::kNewToken:
-      return "the caller needs another token, or must prove the key of this one (HTTP 401)";
+      return NeedOfCaller(reason) + " (HTTP 401)";
     case Remedy::kAccess:
       return "whoever grants access decides: another token will not help (HTTP 403)";
     case Remedy::kService:

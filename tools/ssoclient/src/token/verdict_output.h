@@ -15,8 +15,8 @@ namespace SsoClient::Tool {
 /// "new-token", "access" or "service"; "none" for an accepted token.
 const char* NameOf(Access::Remedy remedy) noexcept;
 
-/// Who can do something about a refusal, in a sentence for people; empty for `Remedy::kNone`.
-std::string RemedyText(Access::Remedy remedy);
+/// What can be done about a refusal and by whom, for people; empty for `Reason::kNone`.
+std::string RemedyText(Access::Reason reason);
 
 /// The option of 'ssoclient verify' to look at after this refusal; empty if no option applies.
 std::string OptionHint(Access::Reason reason);

@@ -10,6 +10,7 @@
 namespace SsoClient::Tool::Testing {
 namespace {
 
+using testing::AllOf;
 using testing::HasSubstr;
 using testing::Not;
 
@@ -127,7 +128,26 @@ TEST_F(LoginFailureTest, AnswersThatAreNotOfAServiceHaveTheirKinds) {
 
 TEST_F(LoginFailureTest, ATokenOfAnotherSignerIsNotWritten) {
   WritePrivate("sts.pem", Sts().StrangerCredential().certificatePem);
-  Fail(PasswordLogin(), 3, "bad-token");
+  EXPECT_THAT(Fail(PasswordLogin(), 3, "bad-token")["remedy"].get<std::string>(),
+              HasSubstr("--sts-certificate"));
+}
+
+TEST_F(LoginFailureTest, TheRemedyOfATokenFitsTheReason) {
+  const auto remedy = [this](const DevSts::AssertionOptions& assertion) {
+    Sts().SetAssertionOptions(assertion);
+    return Fail(PasswordLogin(), 3, "bad-token")["remedy"].get<std::string>();
+  };
+  const auto isAboutAlgorithms =
+      AllOf(HasSubstr("supported algorithm"), Not(HasSubstr("certificate")));
+  DevSts::AssertionOptions signature;
+  signature.signing.signature = DevSts::SignatureAlgorithm::RsaSha1;
+  EXPECT_THAT(remedy(signature), isAboutAlgorithms);
+  DevSts::AssertionOptions digest;
+  digest.signing.digest = DevSts::DigestAlgorithm::Sha1;
+  EXPECT_THAT(remedy(digest), isAboutAlgorithms);
+  DevSts::AssertionOptions late;
+  late.notBeforeOffset = std::chrono::hours(-1);
+  EXPECT_THAT(remedy(late), AllOf(HasSubstr("clocks"), Not(HasSubstr("certificate"))));
 }
 
 TEST_F(LoginFailureTest, TheTimeLimitsTheWholeCall) {

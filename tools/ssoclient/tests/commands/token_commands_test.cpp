@@ -78,6 +78,24 @@ TEST_F(TokenCommandsTest, OnlyATokenOfTheServiceThatIsBoundToTheKeyIsSent) {
   EXPECT_TRUE(Sts().Requests().empty());
 }
 
+TEST_F(TokenCommandsTest, TheRemedyOfATokenThatIsNotFromTheServiceFitsTheReason) {
+  const std::string bound = LogIn("bound", KeyLogin({"--renewable"}));
+  std::string text = Content(bound);
+  const auto remedy = [&] {
+    WritePrivate("bound", text);
+    const ToolResult result = RunTool(WithKey("renew", {"--json", bound}));
+    EXPECT_EQ(result.status, 1) << result.out;
+    EXPECT_EQ(result.Json()["error"]["kind"], "bad-token");
+    return result.Json()["error"]["remedy"].get<std::string>();
+  };
+  text.replace(text.find(">machine@"), 9, ">another@");
+  EXPECT_THAT(remedy(), HasSubstr("--sts-certificate"));
+  const std::string algorithm = "2001/04/xmldsig-more#rsa-sha256";
+  ASSERT_NE(text.find(algorithm), std::string::npos);
+  text.replace(text.find(algorithm), algorithm.size(), "2000/09/xmldsig#rsa-sha1");
+  EXPECT_THAT(remedy(), HasSubstr("supported algorithm"));
+}
+
 TEST_F(TokenCommandsTest, ExchangeGetsATokenForOthers) {
   const std::string own = LogIn("own", KeyLogin({"--delegable"}));
   const ToolResult result =

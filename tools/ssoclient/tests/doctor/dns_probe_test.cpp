@@ -38,7 +38,7 @@ TEST(DnsProbeTest, AddressesAreResolvedWithoutAServer) {
   const Resolution six = ResolveBySystem("::1", 443);
   ASSERT_EQ(six.addresses.size(), 1U);
   EXPECT_TRUE(six.addresses.front().IsIpv6());
-  EXPECT_EQ(FindingOfResolution("::1", six).message, "0 IPv4 and 1 IPv6 address(es)");
+  EXPECT_EQ(FindingOfResolution("::1", six).message, "0 IPv4 addresses and 1 IPv6 address");
 }
 
 TEST(DnsProbeTest, AResolverThatDoesNotAnswerIsLeftToItself) {

@@ -18,6 +18,7 @@ namespace {
 using DevSts::CertificateSpec;
 using DevSts::Credential;
 using Tarnik::Testing::TemporaryFile;
+using testing::HasSubstr;
 
 // The system never connects to it, so that only the files are examined.
 constexpr const char* kUrl = "https://[ff02::1]/sts";
@@ -82,6 +83,25 @@ TEST(DoctorFilesTest, CertificatesOfTrustThatExpireAreWarnings) {
     ExpectFinding(RunDoctor(kUrl, {"--ca", file.Path()}), "trust", finding, "warning");
     ExpectFinding(RunDoctor(kUrl, {"--sts-certificate", file.Path()}), "trust", finding, "warning");
   }
+}
+
+TEST(DoctorFilesTest, ACertificateThatExpiresSoonHasTheRemedyOfItsUse) {
+  const Credential soon = Make(-1, 2);
+  const TemporaryFile file(soon.certificatePem);
+  const DoctorRun ca = RunDoctor(kUrl, {"--ca", file.Path()});
+  EXPECT_THAT(ca.Message("trust"), HasSubstr(" expires in 1 day, on "));
+  EXPECT_THAT(ca.Remedy("trust"), HasSubstr("next certificate of the CA"));
+  EXPECT_THAT(RunDoctor(kUrl, {"--sts-certificate", file.Path()}).Remedy("trust"),
+              HasSubstr("next signing certificate"));
+  EXPECT_EQ(RunIdentity(soon.certificatePem, soon.privateKeyPem).Remedy("credentials"),
+            "have it renewed");
+}
+
+TEST(DoctorFilesTest, TrustedFilesAreCounted) {
+  const TemporaryFile file(Make(-1, 90).certificatePem);
+  EXPECT_EQ(RunDoctor(kUrl, {"--ca", file.Path()}).Message("trust"), "1 CA file trusted");
+  EXPECT_EQ(RunDoctor(kUrl, {"--ca", file.Path(), "--ca", file.Path()}).Message("trust"),
+            "2 CA files trusted");
 }
 
 TEST(DoctorFilesTest, AKeyMustBelongToItsCertificate) {

@@ -126,6 +126,13 @@ TEST_F(DoctorLoginTest, OtherFaultsAndTokensAreFound) {
   late.notBeforeOffset = std::chrono::seconds(-3600);
   sts.SetAssertionOptions(late);
   ExpectFailure(RunAlice(), "login", "token-rejected", 3, "token");
+
+  DevSts::AssertionOptions weak;
+  weak.signing.signature = DevSts::SignatureAlgorithm::RsaSha1;
+  sts.SetAssertionOptions(weak);
+  const DoctorRun run = RunAlice();
+  ExpectFailure(run, "login", "token-rejected", 3, "token");
+  EXPECT_THAT(run.Remedy("login"), HasSubstr("supported algorithm"));
 }
 
 TEST_F(DoctorLoginTest, ThePasswordIsNeverInAReport) {

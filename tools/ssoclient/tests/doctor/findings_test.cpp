@@ -1,5 +1,7 @@
 // Findings of the pure functions, at their limits.
 #include <cerrno>
+#include <cstddef>
+#include <string>
 
 #include <gtest/gtest.h>
 #include <openssl/x509_vfy.h>
@@ -23,6 +25,9 @@ TEST(TcpFindingsTest, OneAddressThatAcceptsIsEnough) {
   const Finding some = FindingOfConnections({{0, false}, {ECONNREFUSED, false}}, 443);
   EXPECT_EQ(some.name, "some-addresses-fail");
   EXPECT_EQ(some.outcome, StepOutcome::kWarning);
+  EXPECT_EQ(some.message, "port 443 accepts connections at 1 of 2 addresses");
+  EXPECT_EQ(FindingOfConnections({{0, false}}, 443).message,
+            "port 443 accepts connections at 1 of 1 address");
 }
 
 TEST(TcpFindingsTest, TheErrorThatSaysMostCounts) {
@@ -73,6 +78,31 @@ TEST(ChainFindingsTest, ACertificateNeedsAttentionThirtyDaysBeforeItsEnd) {
   facts.links = {link};
   EXPECT_EQ(FindingOfChain(facts, DateTime::Parse("2026-01-01T00:00:00Z")).name, "ok");
   EXPECT_EQ(FindingOfChain(facts, DateTime::Parse("2026-01-01T00:00:01Z")).name, "expires-soon");
+}
+
+TEST(ChainFindingsTest, ACertificateThatExpiresIsRenewedByItsOwner) {
+  ChainFacts facts;
+  facts.links.resize(3);
+  for (ChainLink& link : facts.links) {
+    link.notAfter = DateTime::Parse("2030-01-01T00:00:00Z");
+  }
+  facts.links.back().isSelfIssued = true;
+  const std::string remedies[] = {
+      "have the certificate of the service renewed",
+      "get the next certificate of the CA, and let the service send it",
+      "get the next certificate of the CA from a trusted source, and give it as --ca too"};
+  for (std::size_t i = 0; i < facts.links.size(); ++i) {
+    ChainFacts soon = facts;
+    soon.links[i].notAfter = DateTime::Parse("2026-01-02T12:00:00Z");
+    const Finding finding = FindingOfChain(soon, DateTime::Parse("2026-01-01T00:00:00Z"));
+    EXPECT_EQ(finding.name, "expires-soon");
+    EXPECT_EQ(finding.remedy, remedies[i]);
+    EXPECT_NE(finding.message.find(" expires in 1 day, on "), std::string::npos);
+    soon.errors = {X509_V_ERR_CERT_HAS_EXPIRED};
+    const Finding past = FindingOfChain(soon, DateTime::Parse("2026-02-01T00:00:00Z"));
+    EXPECT_EQ(past.name, "expired");
+    EXPECT_EQ(past.remedy, remedies[i] + ", unless the clock of this machine is wrong");
+  }
 }
 
 TEST(ClockTest, TheMiddleOfTheRoundTripIsCompared) {
