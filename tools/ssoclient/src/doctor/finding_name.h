@@ -125,7 +125,7 @@ class FindingName {
     }
   }
 
-  /// `other` if there is none of this name.
+  /// `other` if no listed name is equal to it.
   static FindingName FindOr(std::string_view name, FindingName other) {
     const auto* const found = std::find(kFindingNames.begin(), kFindingNames.end(), name);
     return found != kFindingNames.end() ? FindingName(*found) : other;
