@@ -75,7 +75,8 @@ class KindName {
       throw "the kind is not listed";
     }
   }
-  /// The listed name that is equal to this one. Throws `std::logic_error` if there is none.
+  /// The listed name that is equal to this one. Throws `std::logic_error` if it is not
+  /// listed.
   static KindName Find(std::string_view name);
 
   std::string Text() const { return std::string(name_); }
