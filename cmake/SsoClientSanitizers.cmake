@@ -22,6 +22,17 @@ function(ssoclient_target_sanitizers)
   endforeach()
 endfunction()
 
+# ssoclient_target_address_only(TARGET...): does not check the targets for undefined behaviour in a build with sanitizers,
+# which are there to check the libraries and the program, since that takes too long.
+function(ssoclient_target_address_only)
+  if(NOT SSOCLIENT_SANITIZER)
+    return()
+  endif()
+  foreach(target IN LISTS ARGN)
+    target_compile_options(${target} PRIVATE -fno-sanitize=undefined)
+  endforeach()
+endfunction()
+
 # ssoclient_target_unoptimized(TARGET...): does not optimise the targets in a build with tests. For code that only calls
 # the libraries under test, since optimising it takes longer than it saves.
 function(ssoclient_target_unoptimized)

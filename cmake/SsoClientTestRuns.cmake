@@ -15,10 +15,8 @@ target_precompile_headers(ssoclient_test_pch PRIVATE
 function(ssoclient_configure_test_target)
   ssoclient_configure_target(${ARGN})
   ssoclient_target_unoptimized(${ARGN})
+  ssoclient_target_address_only(${ARGN})
   foreach(target IN LISTS ARGN)
-    if(SSOCLIENT_SANITIZER)
-      target_compile_options(${target} PRIVATE -fno-sanitize=undefined)
-    endif()
     # Programs and libraries are compiled with the same options, so that they can share the precompiled header.
     set_target_properties(${target} PROPERTIES POSITION_INDEPENDENT_CODE OFF)
     if(NOT target STREQUAL "ssoclient_test_pch")
