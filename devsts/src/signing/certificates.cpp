@@ -21,6 +21,10 @@ using GeneralNameHandle = std::unique_ptr<GENERAL_NAME, FreeWith<GENERAL_NAME_fr
 using ExtensionHandle = std::unique_ptr<X509_EXTENSION, FreeWith<X509_EXTENSION_free>>;
 using NumberHandle = std::unique_ptr<BIGNUM, FreeWith<BN_free>>;
 
+EVP_PKEY* GenerateEcKey(const char* curve) {
+  return EVP_PKEY_Q_keygen(nullptr, nullptr, "EC", curve);
+}
+
 KeyHandle DrawKey(KeyType type) {
   EVP_PKEY* key = nullptr;
   switch (type) {
@@ -34,10 +38,10 @@ KeyHandle DrawKey(KeyType type) {
       key = EVP_RSA_gen(3072);
       break;
     case KeyType::EcP256:
-      key = EVP_EC_gen("P-256");
+      key = GenerateEcKey("P-256");
       break;
     case KeyType::EcP384:
-      key = EVP_EC_gen("P-384");
+      key = GenerateEcKey("P-384");
       break;
   }
   if (key == nullptr) {
