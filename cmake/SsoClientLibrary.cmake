@@ -46,7 +46,7 @@ function(ssoclient_add_library name)
   # Hidden headers include those of the private libraries.
   target_link_libraries(${prefix}_static PUBLIC ${LIBRARY_PRIVATE_LIBRARIES})
   if(NOT LIBRARY_SEPARATE_FOR_TESTS OR NOT SSOCLIENT_BUILD_TESTS)
-    ssoclient_merge_folders(${prefix}_objects "${LIBRARY_SOURCES}")
+    ssoclient_merge_folders(${prefix}_objects "${LIBRARY_SOURCES}" "${CMAKE_UNITY_BUILD}")
   endif()
   ssoclient_link_shared_library(${name} "${LIBRARY_VERSION_SCRIPT}")
   ssoclient_bind_calls(${name} ${prefix}_objects)
@@ -59,10 +59,10 @@ function(ssoclient_add_library name)
     DESCRIPTION "${LIBRARY_DESCRIPTION}" REQUIRES ${LIBRARY_REQUIRES} DEPENDENCIES ${LIBRARY_DEPENDENCIES})
 endfunction()
 
-# ssoclient_merge_folders(OBJECTS FOLDER): with CMAKE_UNITY_BUILD, compiles the sources of each folder below FOLDER as one
+# ssoclient_merge_folders(OBJECTS FOLDER MERGES): if MERGES, compiles the sources of each folder below FOLDER as one
 # translation unit, since most of the time goes into the headers that they share.
-function(ssoclient_merge_folders objects folder)
-  set_target_properties(${objects} PROPERTIES UNITY_BUILD "${CMAKE_UNITY_BUILD}" UNITY_BUILD_MODE GROUP
+function(ssoclient_merge_folders objects folder merges)
+  set_target_properties(${objects} PROPERTIES UNITY_BUILD "${merges}" UNITY_BUILD_MODE GROUP
     UNITY_BUILD_CODE_BEFORE_INCLUDE "// NOLINTNEXTLINE(bugprone-suspicious-include)")
   get_target_property(sources ${objects} SOURCES)
   foreach(source IN LISTS sources)

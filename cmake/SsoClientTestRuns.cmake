@@ -60,12 +60,10 @@ function(ssoclient_separate_tests)
   set_source_files_properties(${ARGN} PROPERTIES SKIP_UNITY_BUILD_INCLUSION ON)
 endfunction()
 
-option(SSOCLIENT_MERGE_TESTS "Compile several test sources as one" "${CMAKE_UNITY_BUILD}")
-
-# ssoclient_merge_tests(TARGET): with SSOCLIENT_MERGE_TESTS, compiles up to eight test sources of a folder as one
+# ssoclient_merge_tests(TARGET): with SSOCLIENT_MERGE_PROGRAMS, compiles up to eight test sources of a folder as one
 # translation unit, since most of the time goes into the headers and templates that they share.
 function(ssoclient_merge_tests target)
-  set_target_properties(${target} PROPERTIES UNITY_BUILD "${SSOCLIENT_MERGE_TESTS}" UNITY_BUILD_MODE GROUP)
+  set_target_properties(${target} PROPERTIES UNITY_BUILD "${SSOCLIENT_MERGE_PROGRAMS}" UNITY_BUILD_MODE GROUP)
   get_target_property(sources ${target} SOURCES)
   list(FILTER sources INCLUDE REGEX "_test\\.cpp$")
   foreach(source IN LISTS sources)
