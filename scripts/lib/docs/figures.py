@@ -1,5 +1,6 @@
 """What is inserted in pages at the marks <!-- figures: NAME -->: the figures of docs/figures/bench.json as tables, with
-the plots of scripts/lib/bench_plots; and what the tree itself says about its tests."""
+the plots of scripts/lib/bench_plots; and what the tree itself says about its tests. What a page itself says before a mark
+<!-- measured: NAME [MEMBER] --> is compared with docs/figures/bench.json."""
 import html
 import json
 import re
@@ -20,6 +21,11 @@ PLOTS = {
 UNITS = {"us": "µs", "ns": "ns", "bytes": "bytes", "times": "times"}
 AIMS = {"ratio_at_most": "ratio at most", "ratio_at_least": "ratio at least", "value_at_most": "at most",
         "value_at_least": "at least"}
+# What a page says before a mark: a number and its unit; without a unit, a ratio or how many there are in a second
+MEASURED = re.compile(r"(?:(\d[\d,.]*)(?: (ns|µs|ms|KB|times))?\s)?<!-- measured: (\S+)(?: (\S+))? -->")
+FACTORS = {"ns": 1e-9, "us": 1e-6, "µs": 1e-6, "ms": 1e-3, "bytes": 1, "KB": 1000, "times": 1, None: 1}
+# Pages round.
+TOLERANCE = 0.05
 
 
 class FigureError(Exception):
@@ -79,6 +85,24 @@ def measured(source, pages, group):
     lines = [plot(pages, name) for name in PLOTS[group]]
     lines += ["", "| what | measured | compared with | ratio | aim |", "|---|---|---|---|---|"]
     return "\n".join(lines + [row(figure) for figure in figures])
+
+
+def compare(source, match):
+    """Compares what a page says with the figure that its mark names: by its value, or by another member, or by how often
+    it is possible in a second ("rate", "reference_rate")."""
+    number, unit, name, member = match.groups()
+    member = member or "value"
+    kept = member.replace("rate", "value") if member.endswith("rate") else member
+    data = json.loads((source / "docs/figures/bench.json").read_text())
+    found = [figure for figure in data["figures"] if figure["name"] == name and kept in figure]
+    if not found or number is None:
+        raise FigureError(f"There is no figure '{name}' with {member}, or no number before its mark.")
+    measured = found[0][kept] * (1 if member == "ratio" else FACTORS[found[0]["unit"]])
+    if member.endswith("rate"):
+        measured = 1 / measured
+    said = float(number.rstrip(".,").replace(",", "")) * FACTORS[unit]
+    if abs(said - measured) > TOLERANCE * measured:
+        raise FigureError(f"The page says {number} for {name}, but its {member} was measured as {measured:g}.")
 
 
 def count_in(source, pattern, expression, exclude=""):

@@ -3,8 +3,8 @@
 
 Writes WORK/pages, WORK/theme and WORK/mkdocs.yml. The pages are the Markdown files of the repository; a link in them
 may lead to any file or folder of the repository, and what is no page becomes one that shows the file. Diagrams are
-drawn, and the marks <!-- figures: NAME --> are replaced by what figures.py makes of them. WORK/api/xml has the output
-of Doxygen.
+drawn, and the marks <!-- figures: NAME --> are replaced by what figures.py makes of them. It also compares the figures
+in the text that have a mark <!-- measured: NAME [MEMBER] -->. WORK/api/xml has the output of Doxygen.
 """
 import os
 import re
@@ -88,6 +88,7 @@ class Pages:
         marked = CODE.sub(hide, text)
         marked = LINK.sub(lambda match: self.link(match, path), marked)
         marked = MARK.sub(lambda match: self.figures(match.group(1), path), marked)
+        marked = figures.MEASURED.sub(lambda match: self.measured(match, path), marked)
         return re.sub(r"\0(\d+)\0", lambda match: spans[int(match.group(1))], marked)
 
     def figures(self, name, path):
@@ -96,6 +97,14 @@ class Pages:
         except figures.FigureError as error:
             self.errors.append(f"{path}: {error}")
             return ""
+
+    def measured(self, match, path):
+        """A figure in the text, without its mark."""
+        try:
+            figures.compare(self.source, match)
+        except figures.FigureError as error:
+            self.errors.append(f"{path}: {error}")
+        return match.group(0)[:match.group(0).index("<!--")].rstrip()
 
     def markdown(self, text, path):
         result, end = [], 0
