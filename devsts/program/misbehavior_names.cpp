@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cstddef>
+#include <map>
 #include <string>
 #include <utility>
 
@@ -56,12 +57,47 @@ HttpAnswer& HttpOf(Misbehavior& target) {
   return *target.httpAnswer;
 }
 
+// The reason phrases of RFC 9110, section 15; a client ignores them.
+std::string ReasonOf(int status) {
+  static const std::map<int, std::string> kReasons{
+      {200, "OK"},
+      {301, "Moved Permanently"},
+      {302, "Found"},
+      {303, "See Other"},
+      {307, "Temporary Redirect"},
+      {308, "Permanent Redirect"},
+      {400, "Bad Request"},
+      {401, "Unauthorized"},
+      {403, "Forbidden"},
+      {404, "Not Found"},
+      {405, "Method Not Allowed"},
+      {407, "Proxy Authentication Required"},
+      {408, "Request Timeout"},
+      {413, "Content Too Large"},
+      {429, "Too Many Requests"},
+      {500, "Internal Server Error"},
+      {502, "Bad Gateway"},
+      {503, "Service Unavailable"},
+      {504, "Gateway Timeout"},
+  };
+  const auto reason = kReasons.find(status);
+  return reason != kReasons.end() ? reason->second : "";
+}
+
 int StatusFrom(const std::string& value) {
   const auto status = static_cast<int>(NumberFrom(value, 999));
   if (status < 100) {
     throw std::invalid_argument("'" + value + "' is not a status of HTTP");
   }
   return status;
+}
+
+// Keeps a reason that was given before the status.
+void SetHttpStatus(int status, HttpAnswer& answer) {
+  if (answer.reason == HttpAnswer{}.reason) {
+    answer.reason = ReasonOf(status);
+  }
+  answer.status = status;
 }
 
 std::size_t SizeFrom(const std::string& value) {
@@ -135,8 +171,8 @@ Vocabulary<Misbehavior> AnswerNames() {
       {"fault-status", "N", "the HTTP status of the fault (500)",
        [](Value value, Misbehavior& target) { FaultOf(target).httpStatus = StatusFrom(value); }},
       {"http-status", "N", "answers over HTTP with this status and without SOAP",
-       [](Value value, Misbehavior& target) { HttpOf(target).status = StatusFrom(value); }},
-      {"http-reason", "TEXT", "the reason of that status",
+       [](Value value, Misbehavior& target) { SetHttpStatus(StatusFrom(value), HttpOf(target)); }},
+      {"http-reason", "TEXT", "another reason phrase for that status",
        [](Value value, Misbehavior& target) { HttpOf(target).reason = OctetsFrom(value); }},
       {"http-header", "NAME: VALUE", "a header field of that answer; may be repeated",
        [](Value value, Misbehavior& target) {

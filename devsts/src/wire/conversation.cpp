@@ -1,6 +1,7 @@
 #include "wire/conversation.h"
 
 #include <algorithm>
+#include <ctime>
 #include <utility>
 
 namespace DevSts {
@@ -46,7 +47,7 @@ bool Conversation::ServeOne() {
   Describe(request);
   const Misbehavior misbehavior = parts_.plan.TakeForRequest();
   const SoapReply reply = Decide(request, misbehavior);
-  const WireAnswer wire = MakeWireAnswer(reply, misbehavior, keepAlive);
+  const WireAnswer wire = MakeWireAnswer(reply, misbehavior, keepAlive, std::time(nullptr));
   Record(request, reply, wire, misbehavior);
   return Delay(misbehavior.delayBeforeAnswer) && Send(wire, misbehavior);
 }

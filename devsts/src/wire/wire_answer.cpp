@@ -35,6 +35,21 @@ bool HasField(const HttpAnswer& answer, const char* name) {
                      [&](const auto& field) { return strcasecmp(field.first.c_str(), name) == 0; });
 }
 
+// The preferred form of RFC 9110, section 5.6.7, in which the names do not depend on the locale.
+std::string HttpDate(std::time_t time) {
+  constexpr std::array<const char*, 7> kDays{"Sun", "Mon", "Tue", "Wed", "Thu", "Fri", "Sat"};
+  constexpr std::array<const char*, 12> kMonths{"Jan", "Feb", "Mar", "Apr", "May", "Jun",
+                                                "Jul", "Aug", "Sep", "Oct", "Nov", "Dec"};
+  std::tm fields{};
+  gmtime_r(&time, &fields);
+  std::array<char, 40> rest{};
+  std::strftime(rest.data(), rest.size(), " %Y %H:%M:%S GMT", &fields);
+  std::array<char, 16> day{};
+  std::snprintf(day.data(), day.size(), "%s, %02d %s", kDays.at(fields.tm_wday), fields.tm_mday,
+                kMonths.at(fields.tm_mon));
+  return std::string(day.data()) + rest.data();
+}
+
 void AddFields(HttpAnswer& answer, const Misbehavior& misbehavior, bool closes) {
   for (const std::string& cookie : misbehavior.setCookies) {
     answer.headers.emplace_back("Set-Cookie", cookie);
@@ -81,7 +96,8 @@ void SetBody(HttpAnswer& answer, const Misbehavior& misbehavior) {
 
 }  // namespace
 
-WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool keepAlive) {
+WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool keepAlive,
+                          std::time_t now) {
   WireAnswer wire;
   wire.closes = !keepAlive || misbehavior.closeConnection || misbehavior.closeUnannounced;
   wire.octets = misbehavior.rawPrefix;
@@ -93,6 +109,9 @@ WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool 
   }
   HttpAnswer answer = AsHttp(std::move(reply), misbehavior);
   AddFields(answer, misbehavior, wire.closes);
+  if (!misbehavior.httpAnswer && !HasField(answer, "Date")) {
+    answer.headers.emplace_back("Date", HttpDate(now));
+  }
   SetBody(answer, misbehavior);
   wire.status = answer.status;
   wire.octets += "HTTP/1.1 " + std::to_string(answer.status) + " " + answer.reason + "\r\n";

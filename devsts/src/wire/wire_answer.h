@@ -2,6 +2,7 @@
 #define DEVSTS_WIRE_WIRE_ANSWER_H
 
 #include <cstddef>
+#include <ctime>
 #include <string>
 
 #include "devsts/misbehavior.h"
@@ -18,8 +19,10 @@ struct WireAnswer {
 };
 
 // Writes the reply with the misbehaviour applied. `keepAlive`: whether the request allows the
-// connection to stay open.
-WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool keepAlive);
+// connection to stay open. `now` is the Date of the answer (RFC 9110, section 6.6.1), unless the
+// misbehaviour has a Date or a whole answer.
+WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool keepAlive,
+                          std::time_t now);
 
 }  // namespace DevSts
 
