@@ -250,6 +250,12 @@ INSTANTIATE_TEST_SUITE_P(
         MisbehaviorCase{"Close", "close", "\r\nConnection: close\r\n"}),
     [](const auto& test) { return std::string(test.param.name); });
 
+TEST_F(CommandsTest, OmitsTheDateByName) {
+  EXPECT_THAT(Ask(), HasSubstr("\r\nDate: "));
+  Execute("misbehave without-date");
+  EXPECT_THAT(Ask(), Not(HasSubstr("\r\nDate: ")));
+}
+
 TEST_F(CommandsTest, EndsConnectionsByName) {
   Execute("misbehave close-unannounced");
   const auto closed = Post();

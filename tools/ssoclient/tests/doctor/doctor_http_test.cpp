@@ -62,6 +62,15 @@ TEST_F(DoctorHttpTest, AllIsWellWithAnStsThatWorks) {
   EXPECT_EQ(run.FirstCause(), "");
 }
 
+TEST_F(DoctorHttpTest, ClocksAreNotComparedWithoutADate) {
+  Misbehavior misbehavior;
+  misbehavior.omitDate = true;
+  const DoctorRun run = RunWith(misbehavior);
+  EXPECT_EQ(run.Status(), 0) << run.Text();
+  EXPECT_EQ(run.Finding("clock"), "not-needed");
+  EXPECT_THAT(run.Message("clock"), HasSubstr("no Date"));
+}
+
 TEST_F(DoctorHttpTest, TheRequestHasNoCredentialsAndNoAccount) {
   Run();
   ASSERT_EQ(sts.Requests().size(), 1U);
