@@ -368,6 +368,12 @@ INSTANTIATE_TEST_SUITE_P(
                       "PrefixList=\"del rsa"},
         AssertionCase{"KeyValue", "key-info=key", "RSAKeyValue", "X509Certificate"},
         AssertionCase{"NoKeyInfo", "key-info=none", "SignatureValue", "X509Certificate"},
+        AssertionCase{"SignedId",
+                      "\"before-signing=|<saml2:AuthnStatement|<saml2:AuthnStatement ID='_x'|\" "
+                      "signed-id=_x",
+                      "<ds:Reference URI=\"#_x\"", "Issuer><ds:Signature"},
+        AssertionCase{"InheritNamespaces", "inherit-namespaces=yes",
+                      "<saml2:Assertion ID=", "<saml2:Assertion xmlns:saml2="},
         AssertionCase{"Indent", "indent=yes", ">\n", "><saml2:Subject"},
         AssertionCase{"IssuerFormat", "issuer-format=no", "Issuer>", "Issuer Format"},
         AssertionCase{"AttributeTypes", "attribute-types=no", "AttributeValue>", "xs:string\">"},

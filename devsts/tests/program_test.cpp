@@ -350,10 +350,12 @@ INSTANTIATE_TEST_SUITE_P(
 TEST(ProgramTest, ReportsAPortThatIsInUse) {
   ProgramProcess program({});
   program.AwaitReady();
-  const ProgramResult second =
-      RunProgram({"--http-port", std::to_string(PortIn(program.Value("http_url")))});
-  EXPECT_EQ(second.status, 3);
-  EXPECT_THAT(second.errors, HasSubstr("a port cannot be opened: bind: Address already in use"));
+  for (const std::string scheme : {"http", "https"}) {
+    const std::string port = std::to_string(PortIn(program.Value(scheme + "_url")));
+    const ProgramResult second = RunProgram({"--" + scheme + "-port", port});
+    EXPECT_EQ(second.status, 3);
+    EXPECT_THAT(second.errors, HasSubstr("a port cannot be opened: bind: Address already in use"));
+  }
 }
 
 TEST(ProgramTest, ReportsAWrongLineOfTheAccounts) {
@@ -371,6 +373,7 @@ TEST(ProgramTest, HelpBeginsWithAnExample) {
   EXPECT_THAT(help.output, HasSubstr("FOR TESTS ONLY"));
   EXPECT_EQ(RunProgram({"--help-misbehaviour"}).output, Program::MisbehaviorHelp());
   EXPECT_EQ(RunProgram({"control", "--help"}).output, Program::ControlHelp());
+  EXPECT_EQ(RunProgram({"--help-control"}).output, Program::ControlHelp());
   EXPECT_EQ(RunProgram({"--help-accounts"}).output, Program::AccountsHelp());
   EXPECT_THAT(RunProgram({"--version"}).output, StartsWith("ssoclient-devsts 1."));
 }

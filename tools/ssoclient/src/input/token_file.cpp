@@ -119,8 +119,12 @@ class NewFile {
 
 }  // namespace
 
+bool IsStandardStream(const std::string& path) {
+  return path == kStandardStream;
+}
+
 SecretText ReadTokenFile(const std::string& path, bool mayBeOpen) {
-  const bool isInput = path == kStandardStream;
+  const bool isInput = IsStandardStream(path);
   const std::string name = isInput ? "standard input" : path;
   SecretText text = isInput ? ReadDescriptor(STDIN_FILENO, name, "token", kMaxTokenBytes)
                             : ReadPrivateFile({.path = path,
@@ -135,7 +139,7 @@ SecretText ReadTokenFile(const std::string& path, bool mayBeOpen) {
 }
 
 void CheckTokenFile(const std::string& path) {
-  if (path == kStandardStream) {
+  if (IsStandardStream(path)) {
     if (isatty(STDOUT_FILENO) == 1) {
       throw ToolException({ExitStatus::kUsage, "output-terminal",
                            "the terminal would show the token, which is as good as a password",
@@ -151,7 +155,7 @@ void CheckTokenFile(const std::string& path) {
 }
 
 void WriteTokenFile(const std::string& path, const std::string& text) {
-  if (path == kStandardStream) {
+  if (IsStandardStream(path)) {
     if (!WriteAll(STDOUT_FILENO, text) || !WriteAll(STDOUT_FILENO, "\n")) {
       FailToWrite("standard output", SystemMessage(errno));
     }

@@ -65,6 +65,13 @@ DoctorRun Examine(const Credential& server, const std::string& chain, const std:
   return RunDoctor(peer.Url(), all);
 }
 
+// What is printed for people about a service that only speaks TLS.
+std::string Print(const Credential& server, const std::string& chain, const std::string& ca) {
+  const Peer peer(TlsPeer(server.certificatePem, server.privateKeyPem, chain));
+  const TemporaryFile file(ca);
+  return RunTool({"doctor", "--url", peer.Url(), "--ca", file.Path()}).out;
+}
+
 TEST(DoctorCertificateTest, AValidChainIsAcceptedAndShown) {
   for (const auto certificate :
        {ServerCertificate::Valid, ServerCertificate::ThroughIntermediate}) {
@@ -114,6 +121,28 @@ TEST(DoctorCertificateTest, TheCaThatIsNeededIsNamed) {
   const DoctorRun single = Examine(server, "", other.certificatePem);
   ExpectFailure(single, "certificate", "unknown-issuer", 3, "http");
   EXPECT_THAT(single.Message("certificate"), HasSubstr("CN=Intermediate"));
+}
+
+TEST(DoctorCertificateTest, AChainThatIsNotTrustedIsShown) {
+  const Credential root = MakeCa("Needed root");
+  const Credential intermediate = MakeCa("Intermediate", false, &root);
+  const Credential other = MakeCa("Other root");
+  const Credential server = DevSts::MakeCertificate(ServerSpec(), &intermediate);
+  const std::string chain = intermediate.certificatePem + root.certificatePem;
+  const DoctorRun run = Examine(server, chain, other.certificatePem);
+  EXPECT_EQ(run.Finding("certificate"), "unknown-ca");
+  EXPECT_EQ(run.Detail("certificate", "/chain/0/subject"), "\"CN=service\"");
+  EXPECT_EQ(run.Detail("certificate", "/chain/1/subject"), "\"CN=Intermediate\"");
+  EXPECT_EQ(run.Detail("certificate", "/chain/2/subject"), "\"CN=Needed root\"");
+  EXPECT_EQ(run.Detail("certificate", "/chain/2/issuer"), "\"CN=Needed root\"");
+
+  const std::string printed = Print(server, chain, other.certificatePem);
+  EXPECT_THAT(printed, HasSubstr("failed  certificate"));
+  for (const char* const line :
+       {" 0: CN=service\n", " 1: CN=Intermediate\n", " 2: CN=Needed root\n"}) {
+    EXPECT_THAT(printed, HasSubstr(line));
+  }
+  EXPECT_THAT(printed, HasSubstr(" SHA-256 "));
 }
 
 TEST(DoctorCertificateTest, ACaWithANewKeyIsFound) {
