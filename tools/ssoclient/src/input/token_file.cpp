@@ -11,6 +11,7 @@
 
 #include "failure.h"
 #include "input/descriptor.h"
+#include "input/ending_signals.h"
 #include "input/private_file.h"
 
 namespace SsoClient::Tool {
@@ -50,13 +51,14 @@ void CheckDestination(const std::string& path) {
   }
 }
 
-/// Delays the signals with which users and systems end a process.
+/// Delays the signals that end or stop a process.
 class DelayedSignals {
  public:
   DelayedSignals() {
     sigset_t signals;
     sigemptyset(&signals);
-    for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGTSTP}) {
+    sigaddset(&signals, SIGTSTP);
+    for (const int signal : kEndingSignals) {
       sigaddset(&signals, signal);
     }
     pthread_sigmask(SIG_BLOCK, &signals, &before_);

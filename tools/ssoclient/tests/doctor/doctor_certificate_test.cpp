@@ -6,6 +6,7 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <openssl/x509.h>
 
 #include "devsts/certificates.h"
 #include "devsts/server.h"
@@ -171,6 +172,19 @@ TEST(DoctorCertificateTest, ACertificateForClientsIsNotTrusted) {
   const DoctorRun run = Examine({client.Pem(), client.KeyPem()}, "", root.Pem());
   ExpectFailure(run, "certificate", "not-trusted", 3, "http");
   EXPECT_EQ(run.Detail("certificate", "/isAcceptedByLibrary"), "false");
+}
+
+TEST(DoctorCertificateTest, ACertificateThatCannotBeReadIsAFaultOfTheService) {
+  const Identity root = Tarnik::Testing::MakeCa("Root");
+  const IdentityOptions options{.dnsNames = {}, .addresses = {"127.0.0.1"}};
+  const Identity server = Tarnik::Testing::MakeIdentity(options, &root);
+  ASN1_TIME* const noTime = ASN1_STRING_type_new(V_ASN1_UTCTIME);
+  ASN1_STRING_set(noTime, "269901000000Z", -1);
+  X509_set1_notAfter(server.certificate.get(), noTime);
+  ASN1_STRING_free(noTime);
+  const DoctorRun run = Examine({server.Pem(), server.KeyPem()}, "", root.Pem());
+  ExpectFailure(run, "certificate", "not-trusted", 3, "http");
+  EXPECT_THAT(run.Message("certificate"), HasSubstr("cannot be read"));
 }
 
 TEST(DoctorCertificateTest, ThePeerNameReplacesTheHost) {

@@ -163,6 +163,21 @@ TEST_F(KeyOptionsTest, AFileIsNamedByItsPath) {
   }
 }
 
+// Others can see the arguments of a process, and the failure names the key.
+TEST_F(KeyOptionsTest, AUriWithThePinIsRefusedAndNotRepeated) {
+  for (const std::string attribute : {"pin-value", "PIN-VALUE"}) {
+    for (const std::string command : {"login", "doctor"}) {
+      const ToolResult result = Run(command,
+                                    {"--certificate", PathOf("robot.pem"), "--key",
+                                     "pkcs11:object=me?" + attribute + "=482716"},
+                                    "passphrase");
+      EXPECT_EQ(result.status, 2) << result.out;
+      EXPECT_THAT(result.out, HasSubstr("--key: it must not contain the PIN"));
+      EXPECT_THAT(result.out + result.err, Not(HasSubstr("482716")));
+    }
+  }
+}
+
 TEST_F(KeyOptionsTest, AKeyFileThatOthersCanUseIsRefused) {
   const auto login = Joined(Forms()[1], {"-o", PathOf("token")});
   for (const mode_t mode : {0640U, 0620U, 0604U, 0602U}) {
