@@ -30,11 +30,15 @@ function(ssoclient_install_package)
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_NAME}ConfigVersion.cmake"
     DESTINATION ${cmake_dir} COMPONENT ${PACKAGE_NAME})
 
-  # Relative to the pkg-config file, since the prefix may be chosen at installation.
+  # Relative to the pkg-config file, since the prefix may be chosen at installation. Not for /usr, whose folders
+  # pkg-config leaves out of the flags only if it recognises them.
   file(RELATIVE_PATH up "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
   string(REGEX REPLACE "/$" "" up "${up}")
   list(JOIN PACKAGE_REQUIRES " " PACKAGE_REQUIRES)
   set(PACKAGE_PC_PREFIX "\${pcfiledir}/${up}")
+  if(CMAKE_INSTALL_PREFIX STREQUAL "/usr")
+    set(PACKAGE_PC_PREFIX "/usr")
+  endif()
   configure_file("${PROJECT_SOURCE_DIR}/cmake/package.pc.in"
     "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc" @ONLY)
   install(FILES "${CMAKE_CURRENT_BINARY_DIR}/${PACKAGE_TARGET}.pc"

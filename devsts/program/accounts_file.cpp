@@ -4,6 +4,7 @@
 #include <set>
 #include <sstream>
 #include <stdexcept>
+#include <string_view>
 #include <utility>
 
 #include "devsts/kerberos_realm.h"
@@ -11,6 +12,7 @@
 #include "files.h"
 #include "signing/certificates.h"
 #include "value_forms.h"
+#include "xml/schema_values.h"
 
 namespace DevSts::Program {
 namespace {
@@ -32,6 +34,22 @@ bool HasControlCharacter(const std::string& text) {
   });
 }
 
+// What the tokens, which are UTF-8, cannot contain.
+void RequirePlainText(const std::string& text) {
+  if (HasControlCharacter(text)) {
+    throw std::invalid_argument("there is a control character in this line");
+  }
+  if (!IsUtf8(text)) {
+    throw std::invalid_argument("this line is not UTF-8");
+  }
+}
+
+// Editors of some systems write a byte order mark.
+std::string WithoutMark(const std::string& text) {
+  constexpr std::string_view kMark = "\xef\xbb\xbf";
+  return text.compare(0, kMark.size(), kMark) == 0 ? text.substr(kMark.size()) : text;
+}
+
 std::string FolderOf(const std::string& path) {
   const std::size_t slash = path.rfind('/');
   return slash == std::string::npos ? "" : path.substr(0, slash + 1);
@@ -44,9 +62,7 @@ class Reader {
 
   void Take(const std::string& line, unsigned number) {
     number_ = number;
-    if (HasControlCharacter(line)) {
-      throw std::invalid_argument("there is a control character in this line");
-    }
+    RequirePlainText(line);
     const std::string text = Trimmed(line);
     if (text.empty() || text[0] == '#' || text[0] == ';') {
       return;
@@ -205,7 +221,7 @@ bool IsPlainForRealm(const std::string& text) {
 }  // namespace
 
 AccountsFile ReadAccounts(const std::string& path) {
-  std::istringstream text(ReadWhole(path));
+  std::istringstream text(WithoutMark(ReadWhole(path)));
   Reader reader(path);
   unsigned number = 0;
   try {
@@ -248,6 +264,7 @@ void RequireRealmUsers(const AccountsFile& accounts, const std::string& path) {
 }
 
 bool SetUserProperty(const std::string& key, const std::string& value, User& user) {
+  RequirePlainText(value);
   if (key == "password") {
     user.password = value;
   } else if (key == "group") {
@@ -271,6 +288,7 @@ bool SetUserProperty(const std::string& key, const std::string& value, User& use
 }
 
 void RequireUserName(const std::string& name) {
+  RequirePlainText(name);
   const std::size_t sign = name.find('@');
   if (sign == 0 || sign == std::string::npos || sign + 1 == name.size() ||
       name.find('@', sign + 1) != std::string::npos ||

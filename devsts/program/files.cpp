@@ -23,6 +23,14 @@ constexpr std::size_t kMaxSize = std::size_t{4} << 20U;
                   (error == ELOOP ? "symbolic links are not followed here" : std::strerror(error)));
 }
 
+// A device, such as /dev/null, must not be replaced by a file.
+void RequireNoDevice(const std::string& path) {
+  struct stat found {};
+  if (stat(path.c_str(), &found) == 0 && !S_ISREG(found.st_mode)) {
+    throw FileError(path + ": this is not a regular file");
+  }
+}
+
 mode_t ModeFor(Readers readers) {
   return readers == Readers::OwnerOnly ? 0600 : 0644;
 }
@@ -78,6 +86,7 @@ Descriptor OpenOwn(const std::string& path, int flags, Readers readers) {
 }
 
 void WriteWhole(const std::string& path, const std::string& text, Readers readers) {
+  RequireNoDevice(path);
   std::string pattern = path + ".XXXXXX";
   Descriptor file(mkostemp(pattern.data(), O_CLOEXEC));
   bool done = file.Get() >= 0 && fchmod(file.Get(), ModeFor(readers)) == 0;
@@ -109,6 +118,13 @@ bool Exists(const std::string& path) {
   return lstat(path.c_str(), &found) == 0;
 }
 
+void RemoveFile(const std::string& path) {
+  RequireNoDevice(path);
+  if (unlink(path.c_str()) != 0 && errno != ENOENT) {
+    ThrowFor(path, "cannot be replaced", errno);
+  }
+}
+
 TemporaryFile::TemporaryFile(std::string path, std::string text)
     : path_(std::move(path)), text_(std::move(text)) {
   WriteWhole(path_, text_);
@@ -133,6 +149,14 @@ Descriptor::Descriptor(Descriptor&& other) noexcept : number_(std::exchange(othe
 Descriptor& Descriptor::operator=(Descriptor&& other) noexcept {
   std::swap(number_, other.number_);
   return *this;
+}
+
+void OpenStandardStreams() {
+  for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
+    if (fcntl(stream, F_GETFD) < 0) {
+      static_cast<void>(open("/dev/null", O_RDWR));  // takes the lowest number, which is this one
+    }
+  }
 }
 
 void WriteToDescriptor(int descriptor, const std::string& text) {

@@ -37,12 +37,15 @@ std::string ReadOwnWhole(const std::string& path, Readers readers = Readers::Eve
 // open(). Symbolic links are refused, which could lead to a file that the user has not named.
 Descriptor OpenOwn(const std::string& path, int flags, Readers readers = Readers::Everybody);
 
-// Replaces the file as a whole: readers see the old content or the new one, never a part.
+// Replaces the file as a whole: readers see the old content or the new one, never a part. What is
+// there must be a regular file, if anything.
 void WriteWhole(const std::string& path, const std::string& text,
                 Readers readers = Readers::Everybody);
 
 void MakeFolder(const std::string& path);
 bool Exists(const std::string& path);
+// Does nothing if there is no such file. What is there must be a regular file.
+void RemoveFile(const std::string& path);
 
 // A file that exists as long as the object, unless somebody else replaces it.
 class TemporaryFile {
@@ -56,6 +59,10 @@ class TemporaryFile {
   std::string path_;
   std::string text_;
 };
+
+// Opens /dev/null in place of each standard stream that is closed, whose number another file would
+// otherwise take.
+void OpenStandardStreams();
 
 // Writes everything, and ignores errors of a reader that has gone.
 void WriteToDescriptor(int descriptor, const std::string& text);

@@ -10,6 +10,7 @@
 #include "background.h"
 #include "control_client.h"
 #include "errors.h"
+#include "files.h"
 #include "help_texts.h"
 #include "options.h"
 #include "service_run.h"
@@ -66,6 +67,7 @@ int Main(int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  OpenStandardStreams();
   try {
     return Main(argc, argv);
   } catch (const ProgramError& error) {

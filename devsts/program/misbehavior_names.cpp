@@ -212,6 +212,8 @@ Vocabulary<Misbehavior> FormNames() {
        [](Value value, Misbehavior& target) { target.extraHeaders.push_back(HeaderFrom(value)); }},
       {"cookie", "TEXT", "adds a Set-Cookie field; may be repeated",
        [](Value value, Misbehavior& target) { target.setCookies.push_back(OctetsFrom(value)); }},
+      {"without-date", "", "sends no Date",
+       [](Value, Misbehavior& target) { target.omitDate = true; }},
       {"pad-headers", "OCTETS", "adds header fields of about this size",
        [](Value value, Misbehavior& target) { target.padHeaderBytes = SizeFrom(value); }},
       {"pad-body", "OCTETS", "appends this many spaces to the body",

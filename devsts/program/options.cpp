@@ -29,9 +29,14 @@ struct NamedOptions {
   bool resumesNothing = false;
 };
 
+// What a script writes for a variable that is not set.
+std::string IsGiven(const std::string& text) {
+  return text.empty() ? "The value is empty" : "";
+}
+
 CLI::Option* AddText(CLI::App& app, const char* name, std::string& target, const char* form,
                      const std::string& meaning, const char* group) {
-  return app.add_option(name, target, meaning)->option_text(form)->group(group);
+  return app.add_option(name, target, meaning)->check(IsGiven)->option_text(form)->group(group);
 }
 
 // An option that may be repeated and has one value each time.

@@ -192,6 +192,10 @@ class Service {
       logFile_ = OpenOwn(options_.logFile, O_WRONLY | O_APPEND);
       log_.emplace(logFile_.Get());
     }
+    // A script that waits for it must not read what a service that was killed has left.
+    if (!options_.readyFile.empty()) {
+      RemoveFile(options_.readyFile);
+    }
   }
 
   // Returns false after "quit".

@@ -127,8 +127,17 @@ INSTANTIATE_TEST_SUITE_P(
         WrongLine{"ServicePrincipal", "[service]\nprincipal = HTTP\n", 2, "HTTP/HOST"},
         WrongLine{"RealmAndKeytab", "[service]\nrealm = yes\nkeytab = k\n[user a@B]\n", 4,
                   "exclude each other"},
-        WrongLine{"ControlCharacter", "[user a@B]\npassword = \x01\n", 2, "control character"}),
+        WrongLine{"ControlCharacter", "[user a@B]\npassword = \x01\n", 2, "control character"},
+        WrongLine{"Latin1", "[user a@B]\ngiven-name = Zo\xeb\n", 2, "not UTF-8"},
+        WrongLine{"Latin1Name", "[user Zo\xeb@B]\n", 1, "not UTF-8"}),
     [](const auto& test) { return std::string(test.param.name); });
+
+TEST(AccountsFileTest, MayBeginWithAByteOrderMark) {
+  const ScratchFolder folder;
+  const AccountsFile accounts =
+      Read(folder, "\xef\xbb\xbf[user a@B]\r\ngiven-name = Zo\xc3\xab\r\n");
+  EXPECT_EQ(accounts.users.at("a@B").givenName, "Zo\xc3\xab");
+}
 
 TEST(AccountsFileTest, RefusesPasswordsThatARealmWouldMisread) {
   const ScratchFolder folder;

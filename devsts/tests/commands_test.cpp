@@ -191,6 +191,9 @@ TEST_F(CommandsTest, RefusesWrongCommands) {
                            "add-user alice password=x",
                            "add-user a@B password=",
                            "add-user a@B certificate=x",
+                           "add-user a@B given-name=\x01",
+                           "add-user a@B given-name=\xeb",
+                           "add-user \xeb@B password=x",
                            "set-password nobody@B x",
                            "set-password alice@EXAMPLE.COM \"\"",
                            "remove-user nobody@B",
@@ -249,6 +252,12 @@ INSTANTIATE_TEST_SUITE_P(
         MisbehaviorCase{"Chunks", "chunks=7,5", "\r\n\r\n7\r\n"},
         MisbehaviorCase{"Close", "close", "\r\nConnection: close\r\n"}),
     [](const auto& test) { return std::string(test.param.name); });
+
+TEST_F(CommandsTest, OmitsTheDateByName) {
+  EXPECT_THAT(Ask(), HasSubstr("\r\nDate: "));
+  Execute("misbehave without-date");
+  EXPECT_THAT(Ask(), Not(HasSubstr("\r\nDate: ")));
+}
 
 TEST_F(CommandsTest, EndsConnectionsByName) {
   Execute("misbehave close-unannounced");
@@ -362,6 +371,12 @@ INSTANTIATE_TEST_SUITE_P(
                       "PrefixList=\"del rsa"},
         AssertionCase{"KeyValue", "key-info=key", "RSAKeyValue", "X509Certificate"},
         AssertionCase{"NoKeyInfo", "key-info=none", "SignatureValue", "X509Certificate"},
+        AssertionCase{"SignedId",
+                      "\"before-signing=|<saml2:AuthnStatement|<saml2:AuthnStatement ID='_x'|\" "
+                      "signed-id=_x",
+                      "<ds:Reference URI=\"#_x\"", "Issuer><ds:Signature"},
+        AssertionCase{"InheritNamespaces", "inherit-namespaces=yes",
+                      "<saml2:Assertion ID=", "<saml2:Assertion xmlns:saml2="},
         AssertionCase{"Indent", "indent=yes", ">\n", "><saml2:Subject"},
         AssertionCase{"IssuerFormat", "issuer-format=no", "Issuer>", "Issuer Format"},
         AssertionCase{"AttributeTypes", "attribute-types=no", "AttributeValue>", "xs:string\">"},

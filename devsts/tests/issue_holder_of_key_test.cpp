@@ -223,6 +223,22 @@ TEST(IssueHolderOfKeyTest, ByTokenRefusesAnInvalidToken) {
   EXPECT_FALSE(server.Revoke(IdOfAssertion(token)));
 }
 
+TEST(IssueHolderOfKeyTest, RefusesTheTokensOfAUserWhoWasRemoved) {
+  Server server;
+  const Credential holder = Holder();
+  const std::string token = HolderToken(server, holder);
+  const std::string alices = AssertionIn(Ask(server, AliceEnvelope()));
+  Users users = DemoUsers();
+  users.erase("alice@EXAMPLE.COM");
+  server.SetUsers(users);
+  const std::string asBob = IssueEnvelope("bob@EXAMPLE.COM", "bob-secret", ActAs(alices));
+  for (const std::string& answer :
+       {AskByToken(server, token, IssueBody("PublicKey"), holder), Ask(server, asBob)}) {
+    EXPECT_EQ(ElementText(answer, "faultcode"), "wst:FailedAuthentication");
+    EXPECT_EQ(ElementText(answer, "faultstring"), "There is no user alice@EXAMPLE.COM");
+  }
+}
+
 TEST(IssueHolderOfKeyTest, RefusesARevokedActAsToken) {
   Server server;
   const std::string alices = AssertionIn(Ask(server, AliceEnvelope()));

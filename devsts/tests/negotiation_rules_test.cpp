@@ -200,6 +200,8 @@ TEST_F(NegotiationRulesTest, AppliesTheRulesOfRequestsToFirstLegs) {
        "BinaryExchange/@ValueType is not SPNEGO's"},
       {Replaced(good, ToBase64("leg"), "****"), "wst:InvalidRequest",
        "The BinaryExchange is not Base64"},
+      {Replaced(good, ToBase64("leg"), "bG=n"), "wst:InvalidRequest",
+       "The BinaryExchange is not Base64"},
       {Replaced(good, "</wsse:Security>",
                 UsernameToken("alice@EXAMPLE.COM", "secret") + "</wsse:Security>"),
        "wsse:InvalidSecurity", "A UsernameToken is not expected in a negotiation"},

@@ -1,4 +1,5 @@
 #include <chrono>
+#include <cstdlib>
 #include <string>
 #include <vector>
 
@@ -10,6 +11,7 @@
 #include <signal.h>
 #include <sys/resource.h>
 #include <sys/socket.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 #include <time.h>
 #include <unistd.h>
@@ -125,14 +127,14 @@ TEST(ProgramTest, PausesAndRecoversWhenDescriptorsAreMissing) {
   second.Send(PostOf(AliceEnvelope(), kIssueAction));
   clockid_t clock{};
   ASSERT_EQ(clock_getcpuclockid(program.Id(), &clock), 0);
-  const auto milliseconds = [&] {
+  const auto cpuTime = [&] {
     timespec time{};
     EXPECT_EQ(clock_gettime(clock, &time), 0);
     return time.tv_sec * 1000 + time.tv_nsec / 1'000'000;
   };
-  const long before = milliseconds();
+  const long before = cpuTime();
   EXPECT_TRUE(second.IsSilent(std::chrono::milliseconds(200)));
-  EXPECT_LT(milliseconds() - before, 60);
+  EXPECT_LT(cpuTime() - before, 60);
   ASSERT_EQ(prlimit(program.Id(), RLIMIT_NOFILE, &limit, nullptr), 0);
   EXPECT_THAT(second.ReadAnswer(), StartsWith("HTTP/1.1 200 "));
 }
@@ -191,6 +193,38 @@ TEST(ProgramTest, RunsInTheBackgroundUntilACommandEndsIt) {
   AwaitEnd(end);
   EXPECT_FALSE(FileExists(scratch / "ready") || FileExists(scratch / "pid") || FileExists(control));
   EXPECT_THAT(Control(control, {"quit"}), AllOf(StartsWith("1 "), HasSubstr("no service listens")));
+}
+
+TEST(ProgramTest, RunsInTheBackgroundWithoutStandardStreams) {
+  const ScratchFolder scratch;
+  const std::string control = scratch / "control";
+  const std::string start = std::string(DEVSTS_PROGRAM) + " --background --control " + control;
+  for (const char* closed : {" <&- >/dev/null 2>&-", " <&- >&- 2>&-"}) {
+    ASSERT_EQ(std::system((start + closed).c_str()), 0) << closed;
+    EXPECT_THAT(Control(control, {"counters"}), StartsWith("0 connections=0 ")) << closed;
+    EXPECT_EQ(Control(control, {"quit"}), "0 quitting\n") << closed;
+  }
+}
+
+TEST(ProgramTest, RemovesTheReadyFileOfAServiceThatWasKilled) {
+  const ScratchFolder scratch;
+  WriteTextTo(scratch / "ready", "http_url=http://127.0.0.1:1/sts\n");
+  const ProgramResult result =
+      RunProgram({"--ready-file", scratch / "ready", "--keytab", "/nonexistent"});
+  EXPECT_EQ(result.status, 4);
+  EXPECT_FALSE(FileExists(scratch / "ready"));
+}
+
+TEST(ProgramTest, ReplacesNoDevice) {
+  const ScratchFolder scratch;
+  const std::string device = scratch / "device";
+  ASSERT_EQ(mkfifo(device.c_str(), 0600), 0);
+  for (const char* option : {"--ready-file", "--pid-file"}) {
+    const ProgramResult result = RunProgram({"--end-with-stdin", option, device});
+    EXPECT_EQ(result.status, 4) << option;
+    EXPECT_THAT(result.errors, HasSubstr(device + ": this is not a regular file")) << option;
+    EXPECT_TRUE(FileExists(device)) << option;
+  }
 }
 
 TEST(ProgramTest, ABackgroundStartThatFailsHasItsStatus) {
@@ -323,6 +357,7 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         WrongStart{"UnknownOption", {"--sing"}, 2, "--sing"},
         WrongStart{"NoValue", {"--state"}, 2, "--state"},
+        WrongStart{"EmptyValue", {"--state", ""}, 2, "--state: The value is empty"},
         WrongStart{"Port", {"--http-port", "65536"}, 2, "--http-port"},
         WrongStart{"Exposed", {"--address", "0.0.0.0"}, 2, "--expose-to-network"},
         WrongStart{"Address", {"--address", "localhost"}, 2, "not a numeric address"},
@@ -350,10 +385,12 @@ INSTANTIATE_TEST_SUITE_P(
 TEST(ProgramTest, ReportsAPortThatIsInUse) {
   ProgramProcess program({});
   program.AwaitReady();
-  const ProgramResult second =
-      RunProgram({"--http-port", std::to_string(PortIn(program.Value("http_url")))});
-  EXPECT_EQ(second.status, 3);
-  EXPECT_THAT(second.errors, HasSubstr("a port cannot be opened: bind: Address already in use"));
+  for (const std::string scheme : {"http", "https"}) {
+    const std::string port = std::to_string(PortIn(program.Value(scheme + "_url")));
+    const ProgramResult second = RunProgram({"--" + scheme + "-port", port});
+    EXPECT_EQ(second.status, 3);
+    EXPECT_THAT(second.errors, HasSubstr("a port cannot be opened: bind: Address already in use"));
+  }
 }
 
 TEST(ProgramTest, ReportsAWrongLineOfTheAccounts) {
@@ -371,6 +408,7 @@ TEST(ProgramTest, HelpBeginsWithAnExample) {
   EXPECT_THAT(help.output, HasSubstr("FOR TESTS ONLY"));
   EXPECT_EQ(RunProgram({"--help-misbehaviour"}).output, Program::MisbehaviorHelp());
   EXPECT_EQ(RunProgram({"control", "--help"}).output, Program::ControlHelp());
+  EXPECT_EQ(RunProgram({"--help-control"}).output, Program::ControlHelp());
   EXPECT_EQ(RunProgram({"--help-accounts"}).output, Program::AccountsHelp());
   EXPECT_THAT(RunProgram({"--version"}).output, StartsWith("ssoclient-devsts 1."));
 }

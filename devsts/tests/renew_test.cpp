@@ -127,6 +127,15 @@ TEST(RenewTest, RefusesUnsignedRequestsAndThoseWithOtherCredentials) {
       "wsse:InvalidSecurity", "A UsernameToken is not expected in a Renew request");
 }
 
+TEST(RenewTest, RefusesTheTokenOfAUserWhoWasRemoved) {
+  Server server;
+  const Credential holder = Holder();
+  const std::string token = HolderToken(server, holder);
+  server.SetUsers({});
+  ExpectFault(AskToRenew(server, token, holder), "wst:FailedAuthentication",
+              "There is no user alice@EXAMPLE.COM");
+}
+
 TEST(RenewTest, RefusesATokenThatIsForgedRevokedOrUnknown) {
   ServerOptions options;
   options.issuedTokenLimit = 1;

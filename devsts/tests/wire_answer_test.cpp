@@ -34,6 +34,12 @@ TEST(WireAnswerTest, ADateOfTheMisbehaviourReplacesIt) {
   EXPECT_THAT(Head(misbehavior), Not(HasSubstr("Date:")));
 }
 
+TEST(WireAnswerTest, TheDateIsOmittedOnRequest) {
+  Misbehavior misbehavior;
+  misbehavior.omitDate = true;
+  EXPECT_THAT(Head(misbehavior), Not(HasSubstr("Date:")));
+}
+
 TEST(WireAnswerTest, AWholeAnswerIsSentWithoutADate) {
   Misbehavior misbehavior;
   misbehavior.httpAnswer = HttpAnswer{};

@@ -89,7 +89,10 @@ TEST_F(ServiceClockTest, ARefusedTimestampNamesBothClocksWithAnyHttpStatus) {
 TEST_F(ServiceClockTest, WithoutADateARefusedTimestampIsReportedAsItIs) {
   DevSts::ServerOptions options;
   options.clockSkew = -90s;
-  const DevSts::Server slow(options);
+  DevSts::Server slow(options);
+  DevSts::Misbehavior dateless;
+  dateless.omitDate = true;
+  slow.SetMisbehavior(dateless);
   EXPECT_THAT(
       ExpectFailure<SsoException>(AttemptAt(ConfigFor(slow), slow.HttpsUrl()), FailureKind::kFault),
       MatchesRegex("Unexpected SOAP fault: [a-z]+:InvalidSecurity; request failed\\."));

@@ -98,6 +98,8 @@ struct Misbehavior {
   /// Additional header fields of the answer; one Set-Cookie field for each of `setCookies`.
   std::vector<std::pair<std::string, std::string>> extraHeaders;
   std::vector<std::string> setCookies;
+  /// Sends no Date, which an answer of the service otherwise has.
+  bool omitDate = false;
   /// Adds header fields ("X-Padding-N") of about this many octets in total.
   std::size_t padHeaderBytes = 0;
   /// Appends this many spaces to the body.

@@ -83,7 +83,10 @@ bool Accounts::Has(const std::string& name) const {
 User Accounts::Find(const std::string& name) const {
   const std::lock_guard lock(mutex_);
   const auto found = users_.find(name);
-  return found != users_.end() ? found->second : User();
+  if (found == users_.end()) {
+    ThrowFailedAuthentication("There is no user " + name);
+  }
+  return found->second;
 }
 
 }  // namespace DevSts

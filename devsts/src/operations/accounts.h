@@ -24,7 +24,7 @@ class Accounts {
   // The name and the account of the user who has this certificate. Throws Fault if no user has it.
   std::pair<std::string, User> OwnerOf(const std::string& certificatePem) const;
   bool Has(const std::string& name) const;
-  // Returns an account without properties if there is no user with this name.
+  // Throws Fault if there is no user with this name, who may have been removed.
   User Find(const std::string& name) const;
 
  private:

@@ -180,7 +180,7 @@ std::string IssueBy(Requester requester, TokenContent content, const IssueReques
 
 IssueRequest PrepareIssue(const CheckedRequest& checked, const ServiceParts& parts) {
   IssueRequest request = ReadIssueRequest(checked.soap.bodyEntry, parts.identity.vendorHost);
-  RequireSensibleLifetime(request.created, request.expires);
+  RequireSensibleLifetime(request.created, request.expires, checked.now - parts.clockSkew);
   if (request.created > checked.now + parts.clockSkew) {
     ThrowInvalidTimeRange("The Lifetime begins in the future");
   }

@@ -38,9 +38,12 @@ Time GrantedEnd(Time from, std::chrono::milliseconds asked, const AssertionOptio
   return from + std::min(asked, longest);
 }
 
-void RequireSensibleLifetime(Time created, Time expires) {
+void RequireSensibleLifetime(Time created, Time expires, Time earliestEnd) {
   if (expires <= created) {
     ThrowInvalidTimeRange("The Lifetime is not positive");
+  }
+  if (expires <= earliestEnd) {
+    ThrowInvalidTimeRange("The Lifetime has ended");
   }
 }
 

@@ -54,8 +54,9 @@ std::string IssueAndRemember(TokenContent content, const CheckedRequest& request
 // The end of the validity of a token that is valid from `from`.
 Time GrantedEnd(Time from, std::chrono::milliseconds asked, const AssertionOptions& shape);
 
-// Throws the fault InvalidTimeRange (WS-Trust 1.3, section 11) unless the lifetime is positive.
-void RequireSensibleLifetime(Time created, Time expires);
+// Throws the fault InvalidTimeRange (WS-Trust 1.3, section 11) unless the lifetime is positive
+// and ends after `earliestEnd`.
+void RequireSensibleLifetime(Time created, Time expires, Time earliestEnd);
 
 }  // namespace DevSts
 

@@ -66,7 +66,7 @@ Time StartOf(const RenewRequest& request, const RenewRestriction& restriction, T
 std::string Renew(const CheckedRequest& checked, ServiceParts& parts) {
   const KeyProof& proof = RequireCertificateSignature(checked);
   const RenewRequest request = ReadRenewRequest(checked.soap.bodyEntry);
-  RequireSensibleLifetime(request.created, request.expires);
+  RequireSensibleLifetime(request.created, request.expires, checked.now - parts.clockSkew);
   const PresentedToken token = ReadPresentedToken(request.target, kPlace);
   const IssuedToken issued =
       RequireRenewableState(CheckToken(request.target, token, parts.identity.signing.certificatePem,
@@ -74,6 +74,9 @@ std::string Renew(const CheckedRequest& checked, ServiceParts& parts) {
                             token);
   if (!token.holderCertificatePem) {
     ThrowInvalidRequest(std::string(kPlace) + " is not a holder-of-key token");
+  }
+  if (!parts.accounts.Has(token.subject)) {
+    ThrowFailedAuthentication("There is no user " + token.subject);
   }
   if (!HasSameKey(*token.holderCertificatePem, proof.certificatePem)) {
     ThrowFailedAuthentication("The request is not signed by the key of the RenewTarget");

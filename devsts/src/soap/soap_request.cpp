@@ -1,5 +1,7 @@
 #include "soap/soap_request.h"
 
+#include <regex>
+
 #include "devsts/xml_security.h"
 #include "soap/element_reader.h"
 #include "soap/fault.h"
@@ -14,11 +16,18 @@ void RequireOneField(const ReceivedRequest& request, const char* name) {
   }
 }
 
+// The only parameter that text/xml has is the encoding, which takes precedence over that of the XML
+// declaration (RFC 7303, sections 3.2 and 9.2).
 void RequireTextXml(const ReceivedRequest& request) {
+  static const std::regex& kForm =
+      *new std::regex(R"(text/xml([ \t]*;[ \t]*charset=("utf-8"|utf-8))?)", std::regex::icase);
   RequireOneField(request, "Content-Type");
   const std::string type = request.Header("Content-Type");
-  if (type != "text/xml" && type.rfind("text/xml;", 0) != 0) {
+  if (!std::regex_match(type, kForm)) {
     ThrowInvalidRequest("Content-Type is not text/xml but " + type);
+  }
+  if (request.HeaderCount("Content-Encoding") != 0) {
+    ThrowInvalidRequest("Content-Encoding is not expected");
   }
 }
 
@@ -45,6 +54,7 @@ std::string ReadSoapAction(const ReceivedRequest& request) {
   if (request.method != "POST") {
     ThrowInvalidRequest("The method is not POST but " + request.method);
   }
+  RequireOneField(request, "Host");  // RFC 9112, section 3.2
   RequireTextXml(request);
   RequireOneField(request, "SOAPAction");
   const std::string action = request.Header("SOAPAction");
@@ -59,6 +69,10 @@ SoapRequest ReadEnvelope(const std::string& body, const char* entryName) {
   xmlNode* envelope = xmlDocGetRootElement(request.document.get());
   if (!IsElement(envelope, kSoapNamespace, "Envelope")) {
     ThrowInvalidRequest("The request is not a SOAP 1.1 envelope");
+  }
+  // SOAP 1.1, section 3
+  if (HasProcessingInstruction(request.document.get())) {
+    ThrowInvalidRequest("The request contains a processing instruction");
   }
   RequireAttributes(envelope, {});
   ElementReader reader(envelope);

@@ -62,7 +62,9 @@ HttpReader::Outcome HttpReader::Next(ReceivedRequest& request, bool& keepAlive) 
     }
     boost::system::error_code error;
     buffer_.erase(0, parser.put(boost::asio::buffer(buffer_), error));
-    if (error && error != http::error::need_more) {
+    // What the parser has not taken is a part of a head, of a chunk's head or of a trailer.
+    if ((error && error != http::error::need_more) ||
+        (!parser.is_done() && buffer_.size() > kHeadLimit)) {
       return Outcome::Malformed;
     }
     if (parser.is_done()) {

@@ -109,7 +109,7 @@ WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool 
   }
   HttpAnswer answer = AsHttp(std::move(reply), misbehavior);
   AddFields(answer, misbehavior, wire.closes);
-  if (!misbehavior.httpAnswer && !HasField(answer, "Date")) {
+  if (!misbehavior.httpAnswer && !misbehavior.omitDate && !HasField(answer, "Date")) {
     answer.headers.emplace_back("Date", HttpDate(now));
   }
   SetBody(answer, misbehavior);

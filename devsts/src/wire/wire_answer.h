@@ -20,7 +20,7 @@ struct WireAnswer {
 
 // Writes the reply with the misbehaviour applied. `keepAlive`: whether the request allows the
 // connection to stay open. `now` is the Date of the answer (RFC 9110, section 6.6.1), unless the
-// misbehaviour has a Date or a whole answer.
+// misbehaviour has a Date or a whole answer, or omits it.
 WireAnswer MakeWireAnswer(SoapReply reply, const Misbehavior& misbehavior, bool keepAlive,
                           std::time_t now);
 

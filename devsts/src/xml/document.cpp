@@ -81,6 +81,10 @@ DocumentHandle ParseXml(std::string_view text) {
   if (!parser) {
     throw XmlError("no memory for a parser");
   }
+  // libxml2 would ignore what follows.
+  if (text.find('\0') != std::string_view::npos) {
+    throw XmlError("there is a character 0");
+  }
   constexpr int kOptions = XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING;
   DocumentHandle document(xmlCtxtReadMemory(
       parser.get(), text.data(), static_cast<int>(text.size()), nullptr, nullptr, kOptions));
@@ -168,6 +172,17 @@ xmlNode* NextNode(const xmlNode* root, xmlNode* node) {
 }
 
 }  // namespace
+
+bool HasProcessingInstruction(const xmlDoc* document) {
+  for (xmlNode* top = document->children; top != nullptr; top = top->next) {
+    for (xmlNode* node = top; node != nullptr; node = NextNode(top, node)) {
+      if (node->type == XML_PI_NODE) {
+        return true;
+      }
+    }
+  }
+  return false;
+}
 
 xmlNode* NextElement(const xmlNode* root, xmlNode* node) {
   do {

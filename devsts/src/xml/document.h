@@ -52,6 +52,8 @@ bool HasAttribute(const xmlNode* element, const char* name, const char* uri = nu
 // The child elements in document order.
 std::vector<xmlNode*> ChildElements(const xmlNode* element);
 
+bool HasProcessingInstruction(const xmlDoc* document);
+
 // The next element in document order, descendants included; null after the last one in `root`.
 xmlNode* NextElement(const xmlNode* root, xmlNode* node);
 

@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <regex>
 
+#include <libxml/xmlstring.h>
 #include <openssl/evp.h>
 
 #include "devsts/xml_security.h"
@@ -38,6 +39,11 @@ std::optional<minutes> OffsetOf(const std::string& zone) {
 
 }  // namespace
 
+bool IsUtf8(const std::string& text) {
+  return text.find('\0') == std::string::npos &&
+         xmlCheckUTF8(reinterpret_cast<const unsigned char*>(text.c_str())) == 1;
+}
+
 std::string ToBase64(const Octets& octets) {
   std::string text(4 * ((octets.size() + 2) / 3) + 1, '\0');
   const int size = EVP_EncodeBlock(reinterpret_cast<unsigned char*>(text.data()), octets.data(),
@@ -53,7 +59,7 @@ Octets FromBase64(std::string text) {
   const int size =
       EVP_DecodeBlock(octets.data(), reinterpret_cast<const unsigned char*>(text.data()),
                       static_cast<int>(text.size()));
-  if (size < 0 || padding > 2 || text.size() % 4 != 0) {
+  if (size < 0 || padding > 2 || text.size() % 4 != 0 || text.find('=') < text.size() - padding) {
     throw XmlError("not Base64");
   }
   octets.resize(static_cast<std::size_t>(size) - padding);

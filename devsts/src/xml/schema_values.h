@@ -18,6 +18,9 @@ inline constexpr char kBase64Binary[] =
     "http://docs.oasis-open.org/wss/2004/01/"
     "oasis-200401-wss-soap-message-security-1.0#Base64Binary";
 
+// Whether the text is UTF-8 without the character 0.
+bool IsUtf8(const std::string& text);
+
 // Base64 (RFC 4648, section 4) without line breaks.
 std::string ToBase64(const Octets& octets);
 

@@ -32,7 +32,7 @@ std::vector<Registered> AddCommands(CLI::App& program) {
   std::vector<Registered> all;
   for (std::unique_ptr<Command>& command : MakeCommands()) {
     CLI::App* const subcommand = command->AddTo(program);
-    RefuseValuesOfFlags(*subcommand);
+    RefuseWrongValues(*subcommand);
     all.push_back({std::move(command), subcommand});
   }
   return all;
@@ -118,7 +118,7 @@ ExitStatus RunProgram(int argc, const char* const* argv, const Console& console)
   program.formatter(std::make_shared<HelpFormatter>());
   const std::vector<Registered> commands = AddCommands(program);
   try {
-    program.parse(argc, argv);
+    program.parse(ArgumentsToParse(argc, argv));
   } catch (const CLI::Success& asked) {
     // --help or --version
     program.exit(asked, console.out, console.err);

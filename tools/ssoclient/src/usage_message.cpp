@@ -74,6 +74,10 @@ bool IsFlag(const CLI::Option& option) {
   return option.get_expected_max() == 0;
 }
 
+std::string CheckFilled(const std::string& value) {
+  return value.empty() ? "it must not be empty" : std::string();
+}
+
 // Of the wrong number of values.
 std::string MessageOfMismatch(const CLI::Option& option) {
   if (IsFlag(option)) {
@@ -115,12 +119,34 @@ std::string MessageOf(const CLI::ParseError& error, const CLI::App& command) {
 
 }  // namespace
 
-void RefuseValuesOfFlags(CLI::App& command) {
+void RefuseWrongValues(CLI::App& command) {
   for (CLI::Option* option : command.get_options({})) {
     if (IsFlag(*option)) {
       option->disable_flag_override();
+    } else {
+      option->check(CheckFilled);
     }
   }
+}
+
+std::vector<std::string> ArgumentsToParse(int argc, const char* const* argv) {
+  std::vector<std::string> arguments;
+  bool areOptions = true;
+  for (int i = 1; i < argc; ++i) {
+    std::string argument = argv[i];
+    areOptions = areOptions && argument != "--";
+    const bool isWithoutValue =
+        areOptions && argument.starts_with("--") && argument.find('=', 3) == argument.size() - 1;
+    if (isWithoutValue) {
+      argument.pop_back();
+    }
+    arguments.push_back(std::move(argument));
+    if (isWithoutValue) {
+      arguments.emplace_back();
+    }
+  }
+  std::reverse(arguments.begin(), arguments.end());
+  return arguments;
 }
 
 std::string UsageMessage(const CLI::ParseError& error, const CLI::App& program, int argc,

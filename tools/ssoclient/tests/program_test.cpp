@@ -86,12 +86,39 @@ TEST(ProgramTest, WhatIsWrongIsSaidInOneWay) {
        "--largest-token: it must not be 0"},
       {{"verify", "--audience", "a", "--largest-token", "-1", "token.xml"},
        "--largest-token: '-1' is not a whole number"},
+      {{"verify", "--audience", "a", "--largest-token", "010", "token.xml"},
+       "--largest-token: '010' is not a whole number"},
+      {Login({"--password-fd", "010"}), "--password-fd: it must be the number of a descriptor"},
   };
   for (const auto& [arguments, message] : wrong) {
     const ToolResult result = RunTool(arguments);
     EXPECT_EQ(result.status, 2);
     EXPECT_EQ(result.err.substr(0, result.err.find('\n')), "ssoclient: " + message);
   }
+}
+
+// Such as "$FILE" of a variable that is not set: the token would be printed, for example.
+TEST(ProgramTest, AnEmptyValueIsNotAMissingOption) {
+  const std::vector<std::string> options = {
+      "--output",   "--password-file", "--certificate", "--act-as", "--delegate-to",
+      "--audience", "--peer-name",     "--ca",          "--tls-crl"};
+  for (const std::string& option : options) {
+    for (const auto& value : {std::vector<std::string>{option, ""}, {option + "="}}) {
+      const ToolResult result = RunTool(Login(value));
+      EXPECT_EQ(result.status, 2);
+      EXPECT_THAT(result.err, HasSubstr("ssoclient: " + option + ": it must not be empty\n"));
+    }
+  }
+  EXPECT_THAT(RunTool({"show", ""}).err, HasSubstr("FILE: it must not be empty"));
+  EXPECT_THAT(RunTool({"verify", "--audience", "a", "--trust-for", "", "sts.pem", "token"}).err,
+              HasSubstr("--trust-for: it must not be empty"));
+}
+
+TEST(ProgramTest, TheNextArgumentIsNotTheValueOfAnOptionWithoutOne) {
+  const ToolResult result = RunTool(Login({"--output=", "--json"}));
+  EXPECT_EQ(result.status, 2);
+  EXPECT_THAT(result.out, HasSubstr("--output: it must not be empty"));
+  EXPECT_THAT(RunTool({"show", "--", "--name="}).err, HasSubstr("the token file --name=: "));
 }
 
 }  // namespace

@@ -9,6 +9,8 @@
 #include "commands/bound_token.h"
 #include "commands/commands.h"
 #include "input/private_file.h"
+#include "input/standard_input.h"
+#include "input/token_file.h"
 #include "options/key_options.h"
 #include "options/request_options.h"
 #include "options/service_options.h"
@@ -72,6 +74,8 @@ Token Exchange(const Console& console, const ServiceSetup& setup, const Token& o
 }
 
 Outcome ExchangeCommand::Run(const Console& console) {
+  CheckStandardInput({{"FILE", IsStandardStream(file_)}, request_.ActAsInput()},
+                     {key_.PassphraseInput()});
   output_.SetDefault("-");
   output_.Check(WantsJson());
   ServiceSetup setup = service_.MakeSetup();

@@ -10,6 +10,7 @@
 #include "failure.h"
 #include "input/private_file.h"
 #include "input/secret.h"
+#include "input/standard_input.h"
 #include "options/kerberos_options.h"
 #include "options/key_options.h"
 #include "options/request_options.h"
@@ -143,6 +144,8 @@ Token LoginCommand::LoginByAny(const Console& console, const ServiceSetup& setup
 
 Outcome LoginCommand::Run(const Console& console) {
   CheckLogin();
+  CheckStandardInput({request_.ActAsInput()},
+                     {{"--password-fd", password_.IsStandardInput()}, key_.PassphraseInput()});
   output_.SetDefault("-");
   output_.Check(WantsJson());
   const ServiceSetup setup = MakeSetup();

@@ -11,6 +11,8 @@
 #include "commands/commands.h"
 #include "failure.h"
 #include "input/private_file.h"
+#include "input/standard_input.h"
+#include "input/token_file.h"
 #include "options/key_options.h"
 #include "options/request_options.h"
 #include "options/service_options.h"
@@ -86,6 +88,7 @@ Token Renew(const Console& console, const ServiceSetup& setup, const Token& toke
 }
 
 Outcome RenewCommand::Run(const Console& console) {
+  CheckStandardInput({{"FILE", IsStandardStream(file_)}}, {key_.PassphraseInput()});
   output_.SetDefault(file_);
   output_.Check(WantsJson());
   ServiceSetup setup = service_.MakeSetup();

@@ -1,3 +1,4 @@
+#include <tarnik/crypto/crypto_exception.h>
 #include <tarnik/system/date_time.h>
 
 #include "doctor/chain.h"
@@ -63,8 +64,17 @@ Step ExamineCertificate(Examination& examination) {
     return step;
   }
   const Plan& plan = examination.plan;
-  const ChainFacts facts =
-      Verify(examination.tls.chain, {plan.caFiles, plan.crlFiles}, examination.ExpectedName());
+  ChainFacts facts;
+  try {
+    facts =
+        Verify(examination.tls.chain, {plan.caFiles, plan.crlFiles}, examination.ExpectedName());
+  } catch (const Tarnik::Crypto::CryptoException& unreadable) {
+    step.finding =
+        Failure(ExitStatus::kUnreachable, "not-trusted",
+                std::string("a certificate of the service cannot be read: ") + unreadable.what(),
+                "have a well-formed certificate issued for the service");
+    return step;
+  }
   for (std::size_t i = 0; i < facts.links.size(); ++i) {
     Show(step, facts.links[i], i);
   }

@@ -21,6 +21,9 @@ class SecretOption {
 
   bool IsGiven() const { return !file_.empty() || descriptor_ >= 0; }
 
+  /// Whether it comes from the descriptor of standard input.
+  bool IsStandardInput() const { return descriptor_ == 0; }
+
   /// The secret: the first line of the file or the descriptor, or what the user types at the
   /// terminal of the process after `prompt`. A descriptor that is a terminal is read in the same
   /// way: without echo. What is after the first line of another descriptor stays there for others.

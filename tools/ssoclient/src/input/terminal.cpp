@@ -1,5 +1,6 @@
 #include "input/terminal.h"
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <csignal>
@@ -11,15 +12,22 @@
 #include <termios.h>
 #include <unistd.h>
 
-#include <tarnik/text/string_util.h>
+#include <tarnik/text/display_text.h>
 
 #include "failure.h"
 #include "input/descriptor.h"
+#include "input/ending_signals.h"
 
 namespace SsoClient::Tool {
 namespace {
 
-constexpr std::array kSignals{SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGTSTP, SIGCONT};
+constexpr auto kSignals = [] {
+  std::array<int, kEndingSignals.size() + 2> signals{SIGTSTP, SIGCONT};
+  std::copy(kEndingSignals.begin(), kEndingSignals.end(), signals.begin() + 2);
+  return signals;
+}();
+
+constexpr std::size_t kMaxPromptBytes = 1000;
 
 volatile std::sig_atomic_t lastSignal = 0;
 
@@ -138,7 +146,9 @@ int ReadLineQuietly(int terminal, const sigset_t& arrivals, std::size_t maxBytes
 int Ask(int terminal, const std::string& prompt, std::size_t maxBytes, SecretText& line) {
   const CaughtSignals signals;
   const QuietTerminal quiet(terminal);
-  if (!WriteAll(terminal, prompt) && errno != EBADF) {
+  // A name in it may come from others, with control characters.
+  const std::string shown = Tarnik::ToDisplayText(prompt, kMaxPromptBytes);
+  if (!WriteAll(terminal, shown) && errno != EBADF) {
     FailWithTerminal(errno);
   }
   return ReadLineQuietly(terminal, signals.Arrivals(), maxBytes, line);

@@ -11,6 +11,7 @@
 
 #include "failure.h"
 #include "input/descriptor.h"
+#include "input/ending_signals.h"
 #include "input/private_file.h"
 
 namespace SsoClient::Tool {
@@ -50,13 +51,14 @@ void CheckDestination(const std::string& path) {
   }
 }
 
-/// Delays the signals with which users and systems end a process.
+/// Delays the signals that end or stop a process.
 class DelayedSignals {
  public:
   DelayedSignals() {
     sigset_t signals;
     sigemptyset(&signals);
-    for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGTSTP}) {
+    sigaddset(&signals, SIGTSTP);
+    for (const int signal : kEndingSignals) {
       sigaddset(&signals, signal);
     }
     pthread_sigmask(SIG_BLOCK, &signals, &before_);
@@ -119,8 +121,12 @@ class NewFile {
 
 }  // namespace
 
+bool IsStandardStream(const std::string& path) {
+  return path == kStandardStream;
+}
+
 SecretText ReadTokenFile(const std::string& path, bool mayBeOpen) {
-  const bool isInput = path == kStandardStream;
+  const bool isInput = IsStandardStream(path);
   const std::string name = isInput ? "standard input" : path;
   SecretText text = isInput ? ReadDescriptor(STDIN_FILENO, name, "token", kMaxTokenBytes)
                             : ReadPrivateFile({.path = path,
@@ -135,7 +141,7 @@ SecretText ReadTokenFile(const std::string& path, bool mayBeOpen) {
 }
 
 void CheckTokenFile(const std::string& path) {
-  if (path == kStandardStream) {
+  if (IsStandardStream(path)) {
     if (isatty(STDOUT_FILENO) == 1) {
       throw ToolException({ExitStatus::kUsage, "output-terminal",
                            "the terminal would show the token, which is as good as a password",
@@ -151,7 +157,7 @@ void CheckTokenFile(const std::string& path) {
 }
 
 void WriteTokenFile(const std::string& path, const std::string& text) {
-  if (path == kStandardStream) {
+  if (IsStandardStream(path)) {
     if (!WriteAll(STDOUT_FILENO, text) || !WriteAll(STDOUT_FILENO, "\n")) {
       FailToWrite("standard output", SystemMessage(errno));
     }

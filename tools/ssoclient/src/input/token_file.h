@@ -7,6 +7,9 @@
 
 namespace SsoClient::Tool {
 
+/// Whether the path is "-", which is standard input or output.
+bool IsStandardStream(const std::string& path);
+
 /// The text of the token in the file, without the white space around it; "-" is standard input.
 /// Throws `ToolException` when the file cannot be read, is empty or larger than 16 MiB, and, unless
 /// `mayBeOpen`, when its group or others may read or write it, since whoever has a bearer token can

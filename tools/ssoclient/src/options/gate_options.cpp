@@ -27,14 +27,12 @@ std::string CheckTimeText(const std::string& text) {
   }
 }
 
-std::string CheckFilled(const std::string& text) {
-  return text.empty() ? "it must not be empty" : std::string();
-}
-
 // Unlike the library's own conversion, this refuses "-1", which some of its versions wrap around.
 std::string CheckCount(const std::string& text) {
   constexpr std::size_t kMostDigits = 15;
-  const bool isCount = !text.empty() && text.size() <= kMostDigits &&
+  // The library reads "010" as eight.
+  const bool isOctal = text.size() > 1 && text.front() == '0';
+  const bool isCount = !text.empty() && !isOctal && text.size() <= kMostDigits &&
                        text.find_first_not_of("0123456789") == std::string::npos;
   return isCount ? std::string() : "'" + text + "' is not a whole number";
 }
@@ -67,9 +65,7 @@ std::string CheckGroup(const std::string& text) {
 // take the arguments after its value.
 CLI::Option* AddRepeated(CLI::App& command, const std::string& name,
                          std::vector<std::string>& values, const std::string& text) {
-  return command.add_option(name, values, text + ". May be repeated")
-      ->allow_extra_args(false)
-      ->check(CheckFilled);
+  return command.add_option(name, values, text + ". May be repeated")->allow_extra_args(false);
 }
 
 }  // namespace
@@ -90,7 +86,6 @@ void GateOptions::AddTrustTo(CLI::App& command) {
       ->group("Trust");
   command.add_option("--issuer", issuer_, "The only issuer that --sts-certificate is for")
       ->type_name("NAME")
-      ->check(CheckFilled)
       ->group("Trust");
   command
       .add_option("--trust-for", pathsOfIssuers_,

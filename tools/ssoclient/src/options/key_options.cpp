@@ -65,14 +65,23 @@ bool IsUri(const std::string& text) {
                      isSchemeCharacter);
 }
 
-// OpenSSL would read the file of a "file:" URI itself, whoever can read or change it.
+// Without regard to case. `what` is in lower case.
+bool ContainsText(std::string_view text, std::string_view what) {
+  return std::search(text.begin(), text.end(), what.begin(), what.end(),
+                     [](unsigned char a, unsigned char b) { return std::tolower(a) == b; }) !=
+         text.end();
+}
+
+// OpenSSL would read the file of a "file:" URI itself, whoever can read or change it. The PIN in a
+// URI (RFC 7512, section 2.4) would be a secret among the arguments.
 std::string CheckKey(const std::string& key) {
   constexpr std::string_view kFileScheme = "file:";
-  const bool isFileUri =
-      key.size() >= kFileScheme.size() &&
-      std::equal(kFileScheme.begin(), kFileScheme.end(), key.begin(),
-                 [](unsigned char a, unsigned char b) { return a == std::tolower(b); });
-  return isFileUri ? "name a file by its path, not by a URI" : std::string();
+  if (ContainsText(std::string_view(key).substr(0, kFileScheme.size()), kFileScheme)) {
+    return "name a file by its path, not by a URI";
+  }
+  return IsUri(key) && ContainsText(key, "pin-value")
+             ? "it must not contain the PIN, which is the passphrase: see --passphrase-file"
+             : std::string();
 }
 
 Tarnik::Crypto::KeyAndCertificate ReadPkcs12(const SecretText& content,

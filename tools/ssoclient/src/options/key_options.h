@@ -6,6 +6,7 @@
 #include <ssoclient/holder_of_key_config.h>
 
 #include "input/secret.h"
+#include "input/standard_input.h"
 
 namespace CLI {
 class App;
@@ -22,6 +23,9 @@ class KeyOptions {
   CLI::Option* AddTo(CLI::App& command, bool isRequired);
 
   bool IsGiven() const { return !certificate_.empty() || !key_.empty(); }
+
+  /// The passphrase, if it comes from a descriptor.
+  Input PassphraseInput() const { return {"--passphrase-fd", passphrase_.IsStandardInput()}; }
 
   /// The file of --certificate.
   const std::string& CertificateFile() const { return certificate_; }

@@ -9,6 +9,8 @@
 #include <ssoclient/token_spec.h>
 
 #include "failure.h"
+#include "input/standard_input.h"
+#include "input/token_file.h"
 
 namespace CLI {
 class App;
@@ -29,6 +31,9 @@ class RequestOptions {
 
   bool WantsBearer() const { return isBearer_; }
   bool WantsHolderOfKey() const { return isHolderOfKey_; }
+
+  /// The act-as token.
+  Input ActAsInput() const { return {"--act-as", IsStandardStream(actAsFile_)}; }
 
   /// The request. Reads the act-as token, which others must not be able to read, unless
   /// `mayBeOpen`. Throws `ToolException` when that fails.

@@ -1,11 +1,15 @@
 #include <chrono>
+#include <csignal>
 #include <string>
+#include <vector>
 
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include "support/service_fixture.h"
 
@@ -216,6 +220,25 @@ TEST_F(LoginCommandTest, AFailedWriteKeepsTheOldFile) {
   EXPECT_EQ(result.Json()["error"]["kind"], "output-file");
   EXPECT_EQ(Content(PathOf("token")), "old");
   EXPECT_EQ(FilesInFolder(), before);
+}
+
+TEST_F(LoginCommandTest, ASignalDuringTheWriteLeavesTheWholeTokenAndNoOtherFile) {
+  std::vector<std::string> after = FilesInFolder();
+  after.emplace_back("token");
+  for (const int signal : {SIGTERM, SIGALRM, SIGXCPU, SIGUSR1}) {
+    unlink(PathOf("token").c_str());
+    ToolOptions options;
+    options.arguments = PasswordLogin({"-o", PathOf("token")});
+    // The system sends the signal when a file is created in the folder.
+    options.prepare = [folder = PathOf(""), signal] {
+      const int watched = open(folder.c_str(), O_RDONLY | O_DIRECTORY);
+      fcntl(watched, F_SETSIG, signal);
+      fcntl(watched, F_NOTIFY, DN_CREATE);
+    };
+    EXPECT_EQ(RunTool(options).signal, signal);
+    EXPECT_THAT(Content(PathOf("token")), testing::EndsWith("Assertion>\n"));
+    EXPECT_EQ(FilesInFolder(), after) << signal;
+  }
 }
 
 TEST_F(LoginCommandTest, NothingIsSentForAnOutputThatCannotBeWritten) {

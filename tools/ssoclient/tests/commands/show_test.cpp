@@ -235,6 +235,8 @@ TEST_F(ShowTest, ColoursAreForTerminalsOnly) {
   const std::string path = files.WriteToken(AssertionText());
   EXPECT_TRUE(Holds(RunOnTerminal({"show", path}).terminal, "\x1b[32m"));
   EXPECT_FALSE(Holds(RunOnTerminal({"show", path}, {{"NO_COLOR", "1"}}).terminal, "\x1b"));
+  EXPECT_TRUE(Holds(RunOnTerminal({"show", path}, {{"NO_COLOR", ""}}).terminal, "\x1b[32m"));
+  EXPECT_FALSE(Holds(RunOnTerminal({"show", path}, {{"TERM", "dumb"}}).terminal, "\x1b"));
   EXPECT_FALSE(Holds(RunInUtf8({"show", path}).out, "\x1b"));
 }
 

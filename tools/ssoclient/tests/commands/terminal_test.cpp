@@ -70,6 +70,13 @@ TEST_F(TerminalTest, ATerminalThatCanOnlyBeReadHasNoPromptAndNoEcho) {
   EXPECT_THAT(result.terminal, Not(HasSubstr(kPrompt)));
 }
 
+TEST_F(TerminalTest, ThePromptHasNoControlCharacters) {
+  ToolOptions options = Login();
+  options.arguments = Command("login", {"--user", "al\x1b[2Jice\u202E", "-o", PathOf("token")});
+  ToolProcess tool(options);
+  EXPECT_TRUE(tool.WaitFor("Password for al?[2Jice?: "));
+}
+
 TEST_F(TerminalTest, ALongLineIsNotKept) {
   ToolProcess tool(Login());
   ASSERT_TRUE(tool.WaitFor(kPrompt));
@@ -82,7 +89,7 @@ TEST_F(TerminalTest, ALongLineIsNotKept) {
 }
 
 TEST_F(TerminalTest, ASignalRestoresTheTerminalAndEndsTheProcess) {
-  for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGQUIT}) {
+  for (const int signal : {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGALRM, SIGXCPU, SIGUSR1}) {
     ToolProcess tool(Login());
     ASSERT_TRUE(tool.WaitFor(kPrompt));
     ASSERT_FALSE(tool.IsEchoing());

@@ -1,4 +1,7 @@
+#include <chrono>
+#include <set>
 #include <string>
+#include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -12,6 +15,16 @@ namespace {
 
 using testing::HasSubstr;
 using testing::Not;
+
+using Names = std::set<std::string>;
+
+Names NamesOf(const nlohmann::json& object) {
+  Names names;
+  for (const auto& [name, value] : object.items()) {
+    names.insert(name);
+  }
+  return names;
+}
 
 class TokenCommandsTest : public ServiceTest {
  protected:
@@ -150,6 +163,55 @@ TEST_F(TokenCommandsTest, ValidateSaysWhatTheServiceSays) {
   const nlohmann::json json = RunTool(Joined(command, {"--json"})).Json();
   EXPECT_EQ(json["isValid"], false);
   EXPECT_EQ(json["status"], "refused");
+}
+
+// The names of docs/tool.md.
+TEST_F(TokenCommandsTest, TheNamesOfTheJsonObjectsAreStable) {
+  const Names ofToken{"advice",
+                      "audiences",
+                      "confirmation",
+                      "delegationChain",
+                      "elapsedPercent",
+                      "groups",
+                      "id",
+                      "isDelegable",
+                      "isRenewable",
+                      "isSolution",
+                      "issuer",
+                      "lifetime",
+                      "names",
+                      "notBefore",
+                      "notOnOrAfter",
+                      "now",
+                      "remaining",
+                      "signatureAlgorithm",
+                      "signer",
+                      "state",
+                      "subject"};
+  const Names ofIssued{"command", "deviations", "output", "status", "token"};
+  const std::string file = PathOf("alice");
+  const nlohmann::json alice = RunTool(PasswordLogin({"--json", "-o", file})).Json();
+  EXPECT_EQ(NamesOf(alice), ofIssued);
+  EXPECT_EQ(NamesOf(alice["token"]), ofToken);
+  const nlohmann::json answer = RunTool(UntrustedCommand("validate", {"--json", file})).Json();
+  EXPECT_EQ(NamesOf(answer), (Names{"command", "isValid", "status", "token"}));
+  EXPECT_EQ(NamesOf(answer["token"]), ofToken);
+
+  Names ofBound = ofToken;
+  ofBound.insert("holder");
+  const std::string own = LogIn("own", KeyLogin({"--renewable"}));
+  DevSts::AssertionOptions options;
+  options.maxLifetime = std::chrono::minutes(10);
+  Sts().SetAssertionOptions(options);
+  for (const char* const command : {"renew", "exchange"}) {
+    const nlohmann::json issued =
+        RunTool(WithKey(command, {"--json", "-o", PathOf("new"), own})).Json();
+    EXPECT_EQ(NamesOf(issued), ofIssued);
+    EXPECT_EQ(NamesOf(issued["token"]), ofBound);
+    EXPECT_EQ(NamesOf(issued["token"]["holder"]),
+              (Names{"issuer", "notAfter", "notBefore", "serialNumber", "sha256", "subject"}));
+    EXPECT_EQ(NamesOf(issued["deviations"].at(0)), (Names{"field", "issued", "requested"}));
+  }
 }
 
 TEST_F(TokenCommandsTest, ColoursAreForTerminalsWithoutNoColor) {

@@ -6,6 +6,7 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <openssl/x509.h>
 
 #include "devsts/certificates.h"
 #include "devsts/server.h"
@@ -65,6 +66,13 @@ DoctorRun Examine(const Credential& server, const std::string& chain, const std:
   return RunDoctor(peer.Url(), all);
 }
 
+// What is printed for people about a service that only speaks TLS.
+std::string Print(const Credential& server, const std::string& chain, const std::string& ca) {
+  const Peer peer(TlsPeer(server.certificatePem, server.privateKeyPem, chain));
+  const TemporaryFile file(ca);
+  return RunTool({"doctor", "--url", peer.Url(), "--ca", file.Path()}).out;
+}
+
 TEST(DoctorCertificateTest, AValidChainIsAcceptedAndShown) {
   for (const auto certificate :
        {ServerCertificate::Valid, ServerCertificate::ThroughIntermediate}) {
@@ -116,6 +124,28 @@ TEST(DoctorCertificateTest, TheCaThatIsNeededIsNamed) {
   EXPECT_THAT(single.Message("certificate"), HasSubstr("CN=Intermediate"));
 }
 
+TEST(DoctorCertificateTest, AChainThatIsNotTrustedIsShown) {
+  const Credential root = MakeCa("Needed root");
+  const Credential intermediate = MakeCa("Intermediate", false, &root);
+  const Credential other = MakeCa("Other root");
+  const Credential server = DevSts::MakeCertificate(ServerSpec(), &intermediate);
+  const std::string chain = intermediate.certificatePem + root.certificatePem;
+  const DoctorRun run = Examine(server, chain, other.certificatePem);
+  EXPECT_EQ(run.Finding("certificate"), "unknown-ca");
+  EXPECT_EQ(run.Detail("certificate", "/chain/0/subject"), "\"CN=service\"");
+  EXPECT_EQ(run.Detail("certificate", "/chain/1/subject"), "\"CN=Intermediate\"");
+  EXPECT_EQ(run.Detail("certificate", "/chain/2/subject"), "\"CN=Needed root\"");
+  EXPECT_EQ(run.Detail("certificate", "/chain/2/issuer"), "\"CN=Needed root\"");
+
+  const std::string printed = Print(server, chain, other.certificatePem);
+  EXPECT_THAT(printed, HasSubstr("failed  certificate"));
+  for (const char* const line :
+       {" 0: CN=service\n", " 1: CN=Intermediate\n", " 2: CN=Needed root\n"}) {
+    EXPECT_THAT(printed, HasSubstr(line));
+  }
+  EXPECT_THAT(printed, HasSubstr(" SHA-256 "));
+}
+
 TEST(DoctorCertificateTest, ACaWithANewKeyIsFound) {
   const Credential old = MakeCa("Renewed root", true);
   const Credential current = MakeCa("Renewed root", true);
@@ -142,6 +172,19 @@ TEST(DoctorCertificateTest, ACertificateForClientsIsNotTrusted) {
   const DoctorRun run = Examine({client.Pem(), client.KeyPem()}, "", root.Pem());
   ExpectFailure(run, "certificate", "not-trusted", 3, "http");
   EXPECT_EQ(run.Detail("certificate", "/isAcceptedByLibrary"), "false");
+}
+
+TEST(DoctorCertificateTest, ACertificateThatCannotBeReadIsAFaultOfTheService) {
+  const Identity root = Tarnik::Testing::MakeCa("Root");
+  const IdentityOptions options{.dnsNames = {}, .addresses = {"127.0.0.1"}};
+  const Identity server = Tarnik::Testing::MakeIdentity(options, &root);
+  ASN1_TIME* const noTime = ASN1_STRING_type_new(V_ASN1_UTCTIME);
+  ASN1_STRING_set(noTime, "269901000000Z", -1);
+  X509_set1_notAfter(server.certificate.get(), noTime);
+  ASN1_STRING_free(noTime);
+  const DoctorRun run = Examine({server.Pem(), server.KeyPem()}, "", root.Pem());
+  ExpectFailure(run, "certificate", "not-trusted", 3, "http");
+  EXPECT_THAT(run.Message("certificate"), HasSubstr("cannot be read"));
 }
 
 TEST(DoctorCertificateTest, ThePeerNameReplacesTheHost) {

@@ -2,6 +2,7 @@
 #include <array>
 #include <ctime>
 #include <string>
+#include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -9,6 +10,7 @@
 #include "devsts/server.h"
 #include "support/doctor_run.h"
 #include "support/temporary_file.h"
+#include "support/token_files.h"
 
 namespace SsoClient::Tool::Testing {
 namespace {
@@ -60,6 +62,15 @@ TEST_F(DoctorHttpTest, AllIsWellWithAnStsThatWorks) {
   }
   EXPECT_EQ(run.Finding("login"), "not-needed");
   EXPECT_EQ(run.FirstCause(), "");
+}
+
+TEST_F(DoctorHttpTest, ClocksAreNotComparedWithoutADate) {
+  Misbehavior misbehavior;
+  misbehavior.omitDate = true;
+  const DoctorRun run = RunWith(misbehavior);
+  EXPECT_EQ(run.Status(), 0) << run.Text();
+  EXPECT_EQ(run.Finding("clock"), "not-needed");
+  EXPECT_THAT(run.Message("clock"), HasSubstr("no Date"));
 }
 
 TEST_F(DoctorHttpTest, TheRequestHasNoCredentialsAndNoAccount) {
@@ -173,6 +184,14 @@ TEST_F(DoctorHttpTest, TheTextEndsWithTheFirstCauseAndItsRemedy) {
   EXPECT_THAT(ill.out, HasSubstr("\nfirst cause: the host has only IPv6 addresses"));
   EXPECT_THAT(ill.out, testing::EndsWith("or the host an IPv4 address\n"));
   EXPECT_EQ(ill.err, "");
+}
+
+TEST_F(DoctorHttpTest, ColoursAreForTerminalsWithoutNoColor) {
+  const std::vector<std::string> arguments{"doctor", "--url", sts.HttpsUrl(), "--ca", ca.Path()};
+  EXPECT_THAT(RunTool(arguments).out, Not(HasSubstr("\x1b")));
+  EXPECT_THAT(RunOnTerminal(arguments).terminal, HasSubstr("\x1b[32mok      \x1b[0mtls"));
+  EXPECT_THAT(RunOnTerminal(arguments, {{"NO_COLOR", ""}}).terminal, HasSubstr("\x1b[32mok "));
+  EXPECT_THAT(RunOnTerminal(arguments, {{"NO_COLOR", "1"}}).terminal, Not(HasSubstr("\x1b")));
 }
 
 }  // namespace

@@ -26,6 +26,7 @@ class DoctorPrivateNetworkTest : public testing::Test {
   void SetUp() override {
     static const std::string obstacle = PrivateNetworkObstacle();
     if (!obstacle.empty()) {
+      ASSERT_FALSE(DoesSystemPermitPrivateNetworks()) << obstacle;
       GTEST_SKIP() << obstacle;
     }
   }

@@ -55,6 +55,25 @@ class KeyOptionsTest : public ServiceTest {
     return RunTool(
         Command(command, Joined(key, {"--json", "--passphrase-file", PathOf(passphrase)})));
   }
+  /// A login with a terminal at which it can ask for the passphrase of both.pem.
+  ToolOptions TerminalLogin(const std::vector<std::string>& arguments) const {
+    ToolOptions options;
+    options.arguments = Command(
+        "login", Joined({"--certificate", PathOf("both.pem"), "-o", PathOf("token")}, arguments));
+    options.hasTerminal = true;
+    options.err = Stream::kTerminal;
+    return options;
+  }
+  void ExpectToReadPassphraseWithoutEcho(const ToolOptions& options) const {
+    ToolProcess tool(options);
+    ASSERT_TRUE(tool.WaitFor("Passphrase for " + PathOf("both.pem") + ": "));
+    EXPECT_FALSE(tool.IsEchoing());
+    tool.Type(kPassphrase + "\n");
+    const ToolResult result = tool.Finish();
+    EXPECT_EQ(result.status, 0) << result.terminal;
+    EXPECT_THAT(result.terminal, Not(HasSubstr(kPassphrase)));
+    EXPECT_THAT(Content(PathOf("token")), HasSubstr("bob"));
+  }
   std::vector<std::vector<std::string>> Forms() const {
     return {{"--certificate", PathOf("robot.p12")},
             {"--certificate", PathOf("robot.pem"), "--key", PathOf("robot.key")},
@@ -92,6 +111,30 @@ TEST_F(KeyOptionsTest, APassphraseFileOfOthersIsRefused) {
   }
 }
 
+TEST_F(KeyOptionsTest, AsksForThePassphraseWithoutEcho) {
+  ExpectToReadPassphraseWithoutEcho(TerminalLogin({}));
+}
+
+TEST_F(KeyOptionsTest, APassphraseFromADescriptorThatIsATerminalIsReadWithoutEcho) {
+  ToolOptions options = TerminalLogin({"--passphrase-fd", "0"});
+  options.in = Stream::kTerminal;
+  ExpectToReadPassphraseWithoutEcho(options);
+}
+
+TEST_F(KeyOptionsTest, APassphraseIsTheFirstLineOfADescriptor) {
+  ToolOptions options;
+  options.arguments = Command("login", {"--json", "-o", PathOf("token"), "--certificate",
+                                        PathOf("both.pem"), "--passphrase-fd", "7"});
+  options.descriptors[7] = kPassphrase + "\nanother\n";
+  const ToolResult right = RunTool(options);
+  EXPECT_EQ(right.status, 0) << right.out;
+
+  options.descriptors[7] = "another\n" + kPassphrase + "\n";
+  const ToolResult wrong = RunTool(options);
+  EXPECT_EQ(wrong.status, 4);
+  EXPECT_EQ(wrong.Json()["error"]["kind"], "key") << wrong.out;
+}
+
 TEST_F(KeyOptionsTest, AKeyCanComeFromAPipe) {
   ToolOptions options;
   options.arguments = Command("login", {"--json", "-o", PathOf("token"), "--certificate",
@@ -116,6 +159,21 @@ TEST_F(KeyOptionsTest, AFileIsNamedByItsPath) {
       EXPECT_EQ(result.status, 2) << result.out;
       EXPECT_EQ(result.Json()["error"]["kind"], "usage");
       EXPECT_THAT(result.out, HasSubstr("--key: name a file by its path"));
+    }
+  }
+}
+
+// Others can see the arguments of a process, and the failure names the key.
+TEST_F(KeyOptionsTest, AUriWithThePinIsRefusedAndNotRepeated) {
+  for (const std::string attribute : {"pin-value", "PIN-VALUE"}) {
+    for (const std::string command : {"login", "doctor"}) {
+      const ToolResult result = Run(command,
+                                    {"--certificate", PathOf("robot.pem"), "--key",
+                                     "pkcs11:object=me?" + attribute + "=482716"},
+                                    "passphrase");
+      EXPECT_EQ(result.status, 2) << result.out;
+      EXPECT_THAT(result.out, HasSubstr("--key: it must not contain the PIN"));
+      EXPECT_THAT(result.out + result.err, Not(HasSubstr("482716")));
     }
   }
 }

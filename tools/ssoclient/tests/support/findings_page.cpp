@@ -86,4 +86,26 @@ const std::vector<DocumentedFinding>& DocumentedFindings() {
   return all;
 }
 
+std::map<std::string, std::set<std::string>> DocumentedDetails() {
+  constexpr std::size_t kDetailCells = 3;
+  std::ifstream page(SSOCLIENT_TOOL_PAGE);
+  std::string line;
+  while (std::getline(page, line) && !line.starts_with("| step | members of `details` |")) {
+  }
+  std::map<std::string, std::set<std::string>> all;
+  std::string step;
+  while (std::getline(page, line) && line.starts_with('|')) {
+    const std::vector<std::string> cells = CellsOf(line);
+    const std::set<std::string> steps = NamesIn(cells.front());
+    step = steps.empty() ? step : *steps.begin();
+    if (cells.size() == kDetailCells && !step.empty()) {
+      all[step].merge(NamesIn(cells[1]));
+    }
+  }
+  if (all.empty()) {
+    throw std::runtime_error(SSOCLIENT_TOOL_PAGE " has no table of details");
+  }
+  return all;
+}
+
 }  // namespace SsoClient::Tool::Testing

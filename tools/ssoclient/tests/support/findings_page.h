@@ -1,6 +1,7 @@
 #ifndef SSOCLIENT_TOOL_TESTS_SUPPORT_FINDINGS_PAGE_H
 #define SSOCLIENT_TOOL_TESTS_SUPPORT_FINDINGS_PAGE_H
 
+#include <map>
 #include <set>
 #include <string>
 #include <vector>
@@ -18,6 +19,10 @@ struct DocumentedFinding {
 /// The rows of the table of findings; a row for several findings gives several. Throws
 /// `std::runtime_error` when the page has no such table.
 const std::vector<DocumentedFinding>& DocumentedFindings();
+
+/// The members of "details" in the page's table, by step. Throws `std::runtime_error` if there are
+/// none. In a name, "." is before a member, and "[]" after a list.
+std::map<std::string, std::set<std::string>> DocumentedDetails();
 
 }  // namespace SsoClient::Tool::Testing
 

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cerrno>
+#include <cstdlib>
 #include <cstring>
 #include <memory>
 #include <stdexcept>
@@ -247,6 +248,14 @@ std::string PrivateNetworkObstacle() {
     throw std::runtime_error(std::string("a private network fails: ") + std::strerror(error));
   }
   return error == 0 ? "" : std::string("no namespaces for this process: ") + std::strerror(error);
+}
+
+bool DoesSystemPermitPrivateNetworks() {
+  const TemporaryFolder folder;
+  const std::string spaces = geteuid() == 0 ? "" : " --map-root-user";
+  const std::string line =
+      "unshare --mount --net" + spaces + " mount -t tmpfs none '" + folder.Path() + "' 2>/dev/null";
+  return std::system(line.c_str()) == 0;
 }
 
 }  // namespace SsoClient::Tool::Testing

@@ -42,6 +42,9 @@ std::function<void()> EnterPrivateNetwork(const PrivateNetwork& network);
 /// `std::runtime_error` when one fails for another reason.
 std::string PrivateNetworkObstacle();
 
+/// Whether unshare(1) and mount(8) can make one, so that an obstacle is a fault of the tests.
+bool DoesSystemPermitPrivateNetworks();
+
 }  // namespace SsoClient::Tool::Testing
 
 #endif
