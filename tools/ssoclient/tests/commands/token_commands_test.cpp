@@ -192,10 +192,10 @@ TEST_F(TokenCommandsTest, TheNamesOfTheJsonObjectsAreStable) {
   const std::string file = PathOf("alice");
   const nlohmann::json alice = RunTool(PasswordLogin({"--json", "-o", file})).Json();
   EXPECT_EQ(NamesOf(alice), ofIssued);
-  EXPECT_EQ(NamesOf(alice["token"]), ofToken);
+  EXPECT_EQ(NamesOf(alice.at("token")), ofToken);
   const nlohmann::json answer = RunTool(UntrustedCommand("validate", {"--json", file})).Json();
   EXPECT_EQ(NamesOf(answer), (Names{"command", "isValid", "status", "token"}));
-  EXPECT_EQ(NamesOf(answer["token"]), ofToken);
+  EXPECT_EQ(NamesOf(answer.at("token")), ofToken);
 
   Names ofBound = ofToken;
   ofBound.insert("holder");
@@ -207,10 +207,10 @@ TEST_F(TokenCommandsTest, TheNamesOfTheJsonObjectsAreStable) {
     const nlohmann::json issued =
         RunTool(WithKey(command, {"--json", "-o", PathOf("new"), own})).Json();
     EXPECT_EQ(NamesOf(issued), ofIssued);
-    EXPECT_EQ(NamesOf(issued["token"]), ofBound);
-    EXPECT_EQ(NamesOf(issued["token"]["holder"]),
+    EXPECT_EQ(NamesOf(issued.at("token")), ofBound);
+    EXPECT_EQ(NamesOf(issued.at("token").at("holder")),
               (Names{"issuer", "notAfter", "notBefore", "serialNumber", "sha256", "subject"}));
-    EXPECT_EQ(NamesOf(issued["deviations"].at(0)), (Names{"field", "issued", "requested"}));
+    EXPECT_EQ(NamesOf(issued.at("deviations").at(0)), (Names{"field", "issued", "requested"}));
   }
 }
 
