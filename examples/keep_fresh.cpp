@@ -2,6 +2,7 @@
 #include <chrono>
 #include <fstream>
 #include <iostream>
+#include <stdexcept>
 #include <string>
 
 #include <ssoclient/access/token_source.h>
@@ -19,26 +20,27 @@ int main(int argc, char** argv) try {
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 3600;
   spec.audienceRestriction = {"https://orders.example.com"};
-
   SsoClient::Access::TokenSourceConfig config;
   config.endpoints = {{argv[1]}};
   config.sslContext = Tarnik::Ssl::CreateSSLContext(tls);
   config.tokenFactory = SsoClient::CreateSamlTokenFactory(trustedKeys.get());
-  config.login = SsoClient::Access::PasswordLogin{argv[4], [file = argv[5]] {
-                                                    std::string password;
-                                                    std::getline(std::ifstream(file), password);
-                                                    return password;
-                                                  }};
+  const auto readPassword = [file = std::string(argv[5])] {
+    std::string password;
+    if (!std::getline(std::ifstream(file), password)) {
+      throw std::runtime_error("cannot read " + file);
+    }
+    return password;
+  };
+  config.login = SsoClient::Access::PasswordLogin{argv[4], readPassword};
   config.keepFresh = {spec};
   config.listener = SsoClient::Access::CreateLogListener();
   const auto source = SsoClient::Access::CreateTokenSource(config);
-
   for (std::string line; std::getline(std::cin, line);) {
     try {
       const auto limit = SsoClient::Access::CallContext::Within(std::chrono::seconds(5));
       const auto token = source->GetToken(spec, limit);
       std::cout << "a token valid until " << token->ExpirationTime().ToString() << std::endl;
-    } catch (const Tarnik::Exception& e) {
+    } catch (const std::exception& e) {
       std::cout << "no token now: " << e.what() << std::endl;
     }
   }

@@ -74,6 +74,14 @@ TEST_F(AccessExamplesTest, KeepFreshSendsAWrongPasswordOnce) {
   EXPECT_EQ(Sts().Requests().size(), 1U);
 }
 
+TEST_F(AccessExamplesTest, KeepFreshNamesAPasswordFileThatIsMissing) {
+  const CommandResult run =
+      RunExample("keep_fresh " + Service() + folder_.Path() + "/none <" + lines_);
+  EXPECT_EQ(run.status, 0);
+  EXPECT_THAT(run.output, HasSubstr("no token now: cannot read " + folder_.Path() + "/none\n"));
+  EXPECT_TRUE(Sts().Requests().empty());
+}
+
 TEST_F(AccessExamplesTest, FailoverAsksTheNextServiceUntilOneDecides) {
   DevSts::Server broken;
   DevSts::Misbehavior unavailable;
