@@ -7,6 +7,8 @@
 #include <iostream>
 #include <stdexcept>
 
+#include <poll.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include "command_line.h"
@@ -53,17 +55,40 @@ std::string ReadLine(int connection) {
   }
 }
 
+// The process at the other end; holds no descriptor if the system does not say which it is.
+Descriptor ServiceOf(int connection) {
+  ucred peer{};
+  socklen_t size = sizeof peer;
+  if (getsockopt(connection, SOL_SOCKET, SO_PEERCRED, &peer, &size) != 0 || peer.pid <= 0) {
+    return Descriptor();
+  }
+  return Descriptor(static_cast<int>(syscall(SYS_pidfd_open, peer.pid, 0)));
+}
+
+// After it, the service's folder, socket and ports are free.
+void AwaitEnd(const Descriptor& service) {
+  constexpr int kMilliseconds = 60000;
+  pollfd ended{service.Get(), POLLIN, 0};
+  if (service.Get() >= 0 && poll(&ended, 1, kMilliseconds) == 0) {
+    throw std::runtime_error("the service has not ended after 60 s");
+  }
+}
+
 }  // namespace
 
 int RunControlClient(const std::string& path, const std::vector<std::string>& command) {
   try {
     const std::string line = LineOf(command);
     const Descriptor connection = ConnectTo(path);
+    const Descriptor service = ServiceOf(connection.Get());
     SendLine(connection.Get(), line);
     const std::string answer = ReadLine(connection.Get());
     const std::size_t space = std::min(answer.find(' '), answer.size() - 1);
     const std::string text = answer.substr(space + 1);
     if (answer.substr(0, space) == "ok") {
+      if (command.front() == "quit") {
+        AwaitEnd(service);
+      }
       std::cout << text << std::endl;
       return 0;
     }

@@ -195,6 +195,18 @@ TEST(ProgramTest, RunsInTheBackgroundUntilACommandEndsIt) {
   EXPECT_THAT(Control(control, {"quit"}), AllOf(StartsWith("1 "), HasSubstr("no service listens")));
 }
 
+TEST(ProgramTest, TheFolderIsFreeAfterQuit) {
+  const ScratchFolder scratch;
+  const std::string control = scratch / "control";
+  for (int i = 0; i < 5; ++i) {
+    const ProgramResult started =
+        RunProgram({"--background", "--control", control, "--state", scratch / "state"});
+    ASSERT_EQ(started.status, 0) << started.errors;
+    ASSERT_EQ(Control(control, {"quit"}), "0 quitting\n");
+    EXPECT_FALSE(FileExists(control));
+  }
+}
+
 TEST(ProgramTest, RunsInTheBackgroundWithoutStandardStreams) {
   const ScratchFolder scratch;
   const std::string control = scratch / "control";
