@@ -31,6 +31,8 @@ std::string RemedyFor(FailureKind kind) {
   switch (kind) {
     case FailureKind::kRefusedLogin:
       return "check the user name, the password or the key";
+    case FailureKind::kFault:
+      return "look for the reason in the log of the service";
     case FailureKind::kExpiredPassword:
       return "set a new password at the service";
     case FailureKind::kUnreachable:

@@ -155,8 +155,11 @@ std::string UsageMessage(const CLI::ParseError& error, const CLI::App& program, 
   if (chosen.empty()) {
     return MessageWithoutCommand(argc, argv);
   }
-  return Is<CLI::ExtrasError>(error) ? MessageOfExtras(program.remaining(true))
-                                     : MessageOf(error, *chosen.front());
+  // The library notices first what is missing, perhaps because an option was misspelt.
+  const std::vector<std::string> extras = program.remaining(true);
+  return Is<CLI::ExtrasError>(error) || std::any_of(extras.begin(), extras.end(), IsOption)
+             ? MessageOfExtras(extras)
+             : MessageOf(error, *chosen.front());
 }
 
 }  // namespace SsoClient::Tool

@@ -10,6 +10,10 @@
 
 namespace SsoClient::Tool {
 
+/// The remedy when a service refuses a request that a token makes, not a login.
+inline constexpr char kRemedyOfRefusedToken[] =
+    "log in again if the token has expired, was revoked, or is unknown to the service";
+
 /// The token in the file, whose signature is verified, and which is bound to `key`. Whether it is
 /// still valid is for the service to decide. Throws `ToolException`: with the status `kRefused` for
 /// a token that is not verified, and of the kind "not-bound" for one without a key or with another.

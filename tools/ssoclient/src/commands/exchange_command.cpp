@@ -79,6 +79,7 @@ Outcome ExchangeCommand::Run(const Console& console) {
   output_.SetDefault("-");
   output_.Check(WantsJson());
   ServiceSetup setup = service_.MakeSetup();
+  setup.remedyOfRefusal = kRemedyOfRefusedToken;
   const auto signers = service_.Signers();
   setup.tokenFactory = CreateSamlTokenFactory(signers.get());
   setup.holderOfKey = key_.Load(mayBeOpen_);

@@ -92,6 +92,7 @@ Outcome RenewCommand::Run(const Console& console) {
   output_.SetDefault(file_);
   output_.Check(WantsJson());
   ServiceSetup setup = service_.MakeSetup();
+  setup.remedyOfRefusal = kRemedyOfRefusedToken;
   const auto signers = service_.Signers();
   setup.tokenFactory = CreateSamlTokenFactory(signers.get());
   setup.holderOfKey = key_.Load(mayBeOpen_);

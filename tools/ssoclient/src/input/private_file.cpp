@@ -57,7 +57,10 @@ void RequireNoExposure(const struct stat& status, const PrivateFile& file) {
                "use a file of your own");
   }
   if (exposure == Exposure::kByMode) {
-    FailAsOpen(file, "other users can read or change " + name, "run 'chmod 600' on it");
+    const bool isOwnFile = S_ISREG(status.st_mode) && status.st_uid == geteuid();
+    FailAsOpen(file, "other users can read or change " + name,
+               isOwnFile ? "run 'chmod 600' on it if nobody else needs it"
+                         : "use a file that only you can read");
   }
 }
 

@@ -71,7 +71,7 @@ std::string ClockText(long offsetSec) {
 }  // namespace
 
 Failure FailureOfCall(const Tarnik::Exception& exception, const ExchangeNotes& notes,
-                      std::string_view secret) {
+                      std::string_view secret, const std::string& remedyOfRefusal) {
   const FailureKind kind = KindOf(exception, notes);
   const std::string message = Tarnik::ToDisplayText(exception.what(), kMaxMessageBytes);
   Failure failure =
@@ -80,6 +80,9 @@ Failure FailureOfCall(const Tarnik::Exception& exception, const ExchangeNotes& n
                       ? "the service's text is not shown, since it contains the password"
                       : message,
                   exception);
+  if (failure.status == ExitStatus::kRefused && !remedyOfRefusal.empty()) {
+    failure.remedy = remedyOfRefusal;
+  }
   const bool isOff =
       notes.clockOffsetSec && std::labs(*notes.clockOffsetSec) > kLargeClockOffsetSec;
   if (failure.status == ExitStatus::kRefused && isOff) {

@@ -150,11 +150,11 @@ int WaitForEnd(const Console& console, const Call& call, Interruption& interrupt
   return 0;
 }
 
-[[noreturn]] void Rethrow(const Call& call, std::string_view secret) {
+[[noreturn]] void Rethrow(const Call& call, const ServiceSetup& setup) {
   try {
     std::rethrow_exception(call.failure);
   } catch (const Tarnik::Exception& exception) {
-    throw ToolException(FailureOfCall(exception, *call.notes, secret));
+    throw ToolException(FailureOfCall(exception, *call.notes, setup.secret, setup.remedyOfRefusal));
   }
 }
 
@@ -185,7 +185,7 @@ void RunCall(const Console& console, const ServiceSetup& setup,
                                     "The time is over, but not in an exchange with the service."));
   }
   if (call->failure != nullptr) {
-    Rethrow(*call, setup.secret);
+    Rethrow(*call, setup);
   }
 }
 

@@ -29,6 +29,8 @@ struct ServiceSetup {
   boost::optional<HolderOfKeyConfig> holderOfKey{};
   /// What is sent and must not be in a message; empty for nothing. It must remain valid.
   std::string_view secret{};
+  /// What to do when the service refuses the request; empty for the remedies of a login.
+  std::string remedyOfRefusal{};
   double timeoutSec = 0;
 };
 

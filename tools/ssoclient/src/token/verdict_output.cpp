@@ -197,9 +197,10 @@ void PrintVerdict(const Console& console, const Access::Verdict& verdict,
   }
   const SamlToken& token = *verdict.Token();
   const Validity validity{token.StartTime(), token.ExpirationTime(), time};
+  const bool isTolerated = validity.GetState() != Validity::State::kValid;
   console.out << console.Paint(Colour::kGood, "accepted") << ": "
               << SafeText(console, PrincipalText(token.Subject())) << ", " << validity.ToString()
-              << '\n';
+              << (isTolerated ? " (within the clock tolerance)\n" : "\n");
 }
 
 }  // namespace SsoClient::Tool

@@ -132,6 +132,22 @@ TEST_F(TokenCommandsTest, ExchangeActsOnBehalfOfTheSubjectOfAToken) {
   EXPECT_EQ(result.Json()["deviations"], nlohmann::json::array());
 }
 
+TEST_F(TokenCommandsTest, ARefusedTokenIsReplacedByALogin) {
+  const std::string path = LogIn("token", KeyLogin({"--renewable", "--delegable"}));
+  for (const char* code : {"FailedAuthentication", "UnableToRenew"}) {
+    DevSts::Misbehavior refusal;
+    refusal.fault = DevSts::FaultAnswer{"http://docs.oasis-open.org/ws-sx/ws-trust/200512", code,
+                                        "The RenewTarget is unknown", false, 500};
+    Sts().SetMisbehavior(refusal);
+    for (const char* command : {"renew", "exchange"}) {
+      const ToolResult result =
+          RunTool(WithKey(command, {"--output", PathOf("new"), "--json", path}));
+      EXPECT_EQ(result.status, 1) << result.out;
+      EXPECT_THAT(result.Json()["error"]["remedy"].get<std::string>(), HasSubstr("log in again"));
+    }
+  }
+}
+
 TEST_F(TokenCommandsTest, ATokenThatIsNotDelegableIsTheRemedyOfARefusal) {
   const std::string own = LogIn("own", KeyLogin());
   const std::string alice = LogIn("alice", PasswordLogin());

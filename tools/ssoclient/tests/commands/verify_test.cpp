@@ -145,8 +145,10 @@ TEST_F(VerifyTest, WhatIsNoTokenIsRefused) {
 TEST_F(VerifyTest, TimesAreThoseOfNowOrOfAnotherMoment) {
   ExpectRefused(AssertionText(HoursFromNow(-2)), {}, "expired", "validity");
   ExpectRefused(AssertionText(HoursFromNow(2)), {}, "not-yet-valid", "validity");
-  EXPECT_EQ(VerifyForAudience(AssertionText(HoursFromNow(-2)), {"--clock-tolerance", "2h"}).status,
-            0);
+  const ToolResult tolerated =
+      VerifyForAudience(AssertionText(HoursFromNow(-2)), {"--clock-tolerance", "2h"});
+  EXPECT_EQ(tolerated.status, 0);
+  EXPECT_TRUE(Holds(tolerated.out, " ago (within the clock tolerance)\n")) << tolerated.out;
   // The certificate of the signer was valid then, too.
   const AssertionText text{
       Tarnik::System::DateTimeFromUtc(HoursFromNow(0).GetUtcTime() - 3'700'000'000, false)};

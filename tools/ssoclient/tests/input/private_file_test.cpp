@@ -77,6 +77,16 @@ TEST(PrivateFileTest, AFileOfAnotherUserIsRefused) {
   EXPECT_EQ(KindOf(open), "");
 }
 
+TEST(PrivateFileTest, NoDeviceIsToBeChanged) {
+  try {
+    ReadPrivateFile({.path = "/dev/null", .what = "key"});
+    ADD_FAILURE() << "a device that everybody can write to was accepted";
+  } catch (const ToolException& exception) {
+    EXPECT_EQ(exception.What().kind, "key-file-open");
+    EXPECT_EQ(exception.What().remedy.find("chmod"), std::string::npos);
+  }
+}
+
 TEST(PrivateFileTest, ContentThatIsPublicMayBeOpen) {
   const TemporaryFile file("key");
   chmod(file.Path().c_str(), 0644);
