@@ -75,7 +75,7 @@ TEST(ProgramTest, WhatIsWrongIsSaidInOneWay) {
       {Login({"--password-fd", "x"}), "--password-fd: it must be the number of a descriptor"},
       {Login({"--kerberos=maybe"}), "--kerberos takes no value"},
       {Login({"--delegable=no"}), "--delegable takes no value"},
-      {Login({"--timeout"}), "--timeout needs its value: SECONDS"},
+      {Login({"--timeout"}), "--timeout needs its value: DURATION"},
       {Login({"--output"}), "--output needs its value: FILE"},
       {Login({"--user", "bob"}), "--user can be given only once"},
       {Login({"--kerberos"}), "--user and --kerberos exclude each other"},

@@ -1,5 +1,8 @@
 #include "options/connection_options.h"
 
+#include <optional>
+#include <string>
+
 #include <CLI/CLI.hpp>
 
 #include <tarnik/core/exception.h>
@@ -7,6 +10,7 @@
 #include <tarnik/ssl/ssl_exception.h>
 
 #include "failure.h"
+#include "output/duration_text.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -14,14 +18,26 @@ namespace {
 constexpr double kShortestTimeoutSec = 0.1;
 constexpr double kLongestTimeoutSec = 3600;
 
-// Unlike CLI::Range, it refuses what is not a number.
-CLI::Validator TimeoutCheck() {
+// A number, or what ParseDuration reads; null for anything else.
+std::optional<double> SecondsOf(const std::string& text) {
+  double seconds = 0;
+  if (CLI::detail::lexical_cast(text, seconds)) {
+    return seconds;
+  }
+  const auto duration = ParseDuration(text);
+  return duration ? std::optional<double>(duration->count()) : std::nullopt;
+}
+
+// Replaces the text by its seconds.
+CLI::Validator TimeoutTransform() {
   return CLI::Validator(
       [](std::string& text) -> std::string {
-        double seconds = 0;
-        const bool isNumber = CLI::detail::lexical_cast(text, seconds);
-        const bool isInRange = seconds >= kShortestTimeoutSec && seconds <= kLongestTimeoutSec;
-        return isNumber && isInRange ? "" : "it must be a number from 0.1 to 3600";
+        const std::optional<double> seconds = SecondsOf(text);
+        if (!seconds || !(*seconds >= kShortestTimeoutSec && *seconds <= kLongestTimeoutSec)) {
+          return "it must be from 0.1 to 3600 seconds, such as 0.5, 90s or 5m";
+        }
+        text = CLI::detail::to_string(*seconds);
+        return {};
       },
       "");
 }
@@ -58,8 +74,8 @@ void ConnectionOptions::AddTo(CLI::App& command) {
   command
       .add_option("--timeout", timeoutSec,
                   "How long the service has to answer, all requests of the command together")
-      ->check(TimeoutCheck())
-      ->type_name("SECONDS")
+      ->transform(TimeoutTransform())
+      ->type_name("DURATION")
       ->capture_default_str()
       ->group(group);
 }

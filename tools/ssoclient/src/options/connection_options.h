@@ -27,7 +27,7 @@ struct ConnectionOptions {
   std::vector<std::string> caFiles{};   ///< --ca FILE, repeatable; the system's store if empty
   std::string peerName{};               ///< --peer-name NAME
   std::vector<std::string> crlFiles{};  ///< --tls-crl FILE
-  double timeoutSec = 30;               ///< --timeout SECONDS of the whole command
+  double timeoutSec = 30;               ///< --timeout DURATION of the whole command
 
   /// Adds the options to the command. --url is required.
   void AddTo(CLI::App& command);

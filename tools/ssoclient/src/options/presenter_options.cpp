@@ -46,15 +46,16 @@ const NamedAlgorithm* FindAlgorithm(const std::string& name) {
   return nullptr;
 }
 
-std::string CheckAlgorithm(const std::string& name) {
-  if (FindAlgorithm(name) != nullptr) {
-    return {};
-  }
+std::string AlgorithmNames() {
   std::string names;
   for (const NamedAlgorithm& each : kAlgorithms) {
     names += (names.empty() ? "" : ", ") + std::string(each.name);
   }
-  return "'" + name + "' is not one of " + names;
+  return names;
+}
+
+std::string CheckAlgorithm(const std::string& name) {
+  return FindAlgorithm(name) != nullptr ? "" : "'" + name + "' is not one of " + AlgorithmNames();
 }
 
 [[noreturn]] void FailToRead(const std::string& path, const std::string& reason) {
@@ -106,7 +107,9 @@ void PresenterOptions::AddTo(CLI::App& command) {
           ->needs(data)
           ->group("Proof");
   data->needs(signature);
-  command.add_option("--proof-algorithm", algorithm_, "The algorithm of the sender's signature")
+  command
+      .add_option("--proof-algorithm", algorithm_,
+                  "The algorithm of the sender's signature: " + AlgorithmNames())
       ->type_name("NAME")
       ->capture_default_str()
       ->check(CheckAlgorithm)

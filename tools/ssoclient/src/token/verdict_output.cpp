@@ -150,13 +150,13 @@ std::string OptionHint(Reason reason) {
     case Reason::kNoProof:
       return "--tls-certificate names the certificate of the caller's TLS connection";
     case Reason::kTooLarge:
-      return "--largest-token";
+      return "--largest-token sets the limit, if the service accepts larger tokens";
     case Reason::kTooLongLived:
-      return "--longest-lifetime";
+      return "--longest-lifetime sets the limit, if the service accepts longer lifetimes";
     case Reason::kTooDeeplyDelegated:
-      return "--deepest-delegation";
+      return "--deepest-delegation sets the limit, if the service accepts more delegates";
     case Reason::kNotInGroup:
-      return "--group";
+      return "--group names the groups of which the caller must have one";
     default:
       return {};
   }

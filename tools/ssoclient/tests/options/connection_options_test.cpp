@@ -52,12 +52,15 @@ TEST(ConnectionOptionsTest, AMalformedUrlIsAWrongCommandLineAndNotRepeated) {
   EXPECT_EQ(KindOf(Parse({"https://sts.example", "--url"})), "");
 }
 
-TEST(ConnectionOptionsTest, TheTimeoutIsANumberInItsRange) {
-  for (const std::string wrong : {"0", "-1", "nan", "inf", "3601", "x", "1s", ""}) {
+TEST(ConnectionOptionsTest, TheTimeoutIsADurationInItsRange) {
+  for (const std::string wrong :
+       {"0", "-1", "nan", "inf", "3601", "x", "1 s", "1x", "0s", "61m", "1.5s", ""}) {
     EXPECT_THROW(Parse({wrong, "--timeout", "https://a", "--url"}), CLI::ParseError) << wrong;
   }
   EXPECT_EQ(Parse({"0.5", "--timeout", "https://a", "--url"}).timeoutSec, 0.5);
   EXPECT_EQ(Parse({"3600", "--timeout", "https://a", "--url"}).timeoutSec, 3600);
+  EXPECT_EQ(Parse({"2s", "--timeout", "https://a", "--url"}).timeoutSec, 2);
+  EXPECT_EQ(Parse({"1h", "--timeout", "https://a", "--url"}).timeoutSec, 3600);
 }
 
 TEST(ConnectionOptionsTest, EachCaFileHasAnOption) {
