@@ -27,14 +27,21 @@ constexpr std::array<Named, 15> kCounters{{
     {"delayed", &Counters::delayed},
 }};
 
-// A peer must not be able to write lines or fields of its own.
-std::string Printable(std::string text) {
+// The text in quotation marks. A peer must not be able to write lines or fields of its own.
+std::string QuotedField(std::string text) {
   for (char& character : text) {
-    if (character < ' ' || character == '\x7f') {
+    if (character < ' ' || character == '\x7f' || character == '"') {
       character = '?';
     }
   }
-  return text;
+  return '"' + text + '"';
+}
+
+// The value of the header without the quotation marks that SOAP 1.1, section 6.1.1, puts around it.
+std::string ActionOf(const ReceivedRequest& request) {
+  const std::string header = request.Header("SOAPAction");
+  const bool isQuoted = header.size() >= 2 && header.front() == '"' && header.back() == '"';
+  return isQuoted ? header.substr(1, header.size() - 2) : header;
 }
 
 }  // namespace
@@ -44,16 +51,16 @@ std::string DescribeRequest(const ReceivedRequest& request) {
   std::string text = "connection=" + std::to_string(request.connectionId) +
                      " tls=" + (request.overTls ? "1" : "0") +
                      " resumed=" + (request.tlsSessionReused ? "1" : "0") +
-                     " action=" + request.Header("SOAPAction") +
+                     " action=" + QuotedField(ActionOf(request)) +
                      " signature=" + kSignatures.at(static_cast<std::size_t>(request.signature)) +
                      " status=" + std::to_string(request.answeredStatus);
   if (request.leg) {
     text += " leg=" + std::to_string(request.leg->ordinal);
   }
   if (!request.answeredFault.empty()) {
-    text += " fault=" + request.answeredFault;
+    text += " fault=" + QuotedField(request.answeredFault);
   }
-  return Printable(std::move(text));
+  return text;
 }
 
 std::string DescribeCounters(const Counters& counters) {

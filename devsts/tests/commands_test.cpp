@@ -138,10 +138,19 @@ TEST_F(CommandsTest, ChangesTheFormOfTokens) {
   EXPECT_THAT(AssertionIn(Ask()), HasSubstr("rsa-sha256"));
 }
 
+TEST_F(CommandsTest, APeerAddsNoFieldsToTheLineOfItsRequest) {
+  RawClient client(server.HttpPort());
+  client.Send(PostOf(AliceEnvelope(), "a\" status=200 b=\"\tc"));
+  EXPECT_THAT(client.ReadAnswer(), HasSubstr("Unsupported SOAPAction"));
+  EXPECT_THAT(Execute("request last"),
+              HasSubstr(" action=\"a? status=200 b=??c\" signature=none status=500 fault=\""));
+}
+
 TEST_F(CommandsTest, ShowsRequestsWithoutPasswords) {
   Ask();
   EXPECT_EQ(Execute("requests"), "ok requests=1");
-  EXPECT_THAT(Execute("request last"), HasSubstr(kIssueAction));
+  EXPECT_THAT(Execute("request last"),
+              HasSubstr(" action=\"" + std::string(kIssueAction) + "\" signature=none "));
   EXPECT_THAT(Execute("request 1"), HasSubstr(" status=200"));
   EXPECT_THAT(Execute("request 1"), Not(HasSubstr("secret")));
   EXPECT_THAT(Execute("request 2"), StartsWith("error "));

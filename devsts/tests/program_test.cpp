@@ -188,7 +188,7 @@ TEST(ProgramTest, RunsInTheBackgroundUntilACommandEndsIt) {
   EXPECT_EQ(ElementText(AskAt(url), "faultstring"), "two words");
   EXPECT_EQ(Control(control, {"sing"}), "1 ssoclient-devsts: unknown command: sing\n");
   EXPECT_THAT(TextOfFile(scratch / "log"),
-              AllOf(StartsWith("request connection="), HasSubstr(" fault=two words\n")));
+              AllOf(StartsWith("request connection="), HasSubstr(" fault=\"two words\"\n")));
   EXPECT_EQ(Control(control, {"quit"}), "0 quitting\n");
   AwaitEnd(end);
   EXPECT_FALSE(FileExists(scratch / "ready") || FileExists(scratch / "pid") || FileExists(control));
