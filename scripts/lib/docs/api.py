@@ -23,7 +23,7 @@ def is_described(element):
 
 
 class Entity:
-    """A class, an enumeration, a function, a type or a constant."""
+    """A class, an enumeration, a function, a type, a constant or a macro."""
 
     def __init__(self, element, kind, name, scope):
         self.element = element
@@ -67,7 +67,19 @@ class Reference:
             if kind in ("class", "struct", "namespace"):
                 root = ElementTree.parse(self.folder / f"{compound.get('refid')}.xml").getroot()
                 self.read(root.find("compounddef"), kind)
+            if kind == "file":
+                root = ElementTree.parse(self.folder / f"{compound.get('refid')}.xml").getroot()
+                self.read_macros(root)
         self.assign_anchors()
+
+    def read_macros(self, root):
+        for element in root.iter("memberdef"):
+            if element.get("kind") != "define" or element.find("initializer") is None:
+                continue  # such as an include guard
+            macro = Entity(element, "define", element.findtext("name"), "")
+            if not macro.has_description():  # of which Doxygen does not warn
+                raise ApiError(f"{macro.file}:{macro.line}: {macro.name} is not documented.")
+            self.entities.setdefault(macro.file, []).append(macro)
 
     def read(self, element, kind):
         name = element.findtext("compoundname")
@@ -208,6 +220,8 @@ class PageWriter:
             bases = ", ".join(f"{base.get('prot')} {'virtual ' if base.get('virt') == 'virtual' else ''}{base.text}"
                               for base in element.findall("basecompoundref") if base.get("prot") != "private")
             return f"{entity.kind} {entity.name}" + (f" : {bases}" if bases else "")
+        if entity.kind == "define":
+            return f"#define {entity.name} {''.join(element.find('initializer').itertext())}"
         text = element.findtext("definition")
         # Doxygen writes the whole scope before the name.
         text = text.replace(f"{entity.scope}::{entity.name}", entity.name)
@@ -295,10 +309,10 @@ class PageWriter:
     def write(self):
         include = self.path.split("/include/")[-1].removeprefix("include/")
         _, _, _, what = library_of(self.path)
-        namespaces = sorted({entity.scope for entity in self.reference.entities[self.path]})
+        scopes = sorted({entity.scope for entity in self.reference.entities[self.path] if entity.scope})
+        namespaces = f" Namespace: {', '.join(f'<code>{name}</code>' for name in scopes)}." if scopes else ""
         parts = [f"# {os.path.basename(self.path)}", f"```cpp\n#include <{include}>\n```",
-                 f"<p>Library: {html.escape(what.split(':')[0])}. Namespace: "
-                 f"{', '.join(f'<code>{name}</code>' for name in namespaces)}.</p>"]
+                 f"<p>Library: {html.escape(what.split(':')[0])}.{namespaces}</p>"]
         previous = None
         for entity in self.reference.entities[self.path]:
             parts += self.entity(entity, previous)
