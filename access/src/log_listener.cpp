@@ -20,30 +20,6 @@ const Tarnik::Service::StaticLogger& Logger() {
   return logger;
 }
 
-const char* NameOf(AttemptOperation operation) noexcept {
-  switch (operation) {
-    case AttemptOperation::kLogin:
-      return "login";
-    case AttemptOperation::kRenewal:
-      return "renewal";
-    case AttemptOperation::kExchange:
-      return "exchange";
-  }
-  return "unknown";
-}
-
-const char* NameOf(CircuitState state) noexcept {
-  switch (state) {
-    case CircuitState::kClosed:
-      return "closed";
-    case CircuitState::kOpen:
-      return "open";
-    case CircuitState::kHalfOpen:
-      return "half-open";
-  }
-  return "unknown";
-}
-
 bool IsRefused(FailureKind kind) noexcept {
   return kind == FailureKind::kRefusedLogin || kind == FailureKind::kExpiredPassword;
 }
@@ -53,6 +29,18 @@ int LevelOf(const AttemptRecord& attempt) noexcept {
     return kTraceLevel;
   }
   return IsRefused(attempt.failure) ? kRefusedLevel : kFailureLevel;
+}
+
+// Such as "Source 'orders'"; a source does not need a name.
+template <typename Record>
+std::string SourceOf(const Record& record) {
+  return record.source.empty() ? "Source" : "Source '" + record.source + "'";
+}
+
+// Such as "renewal at https://sts.example.com"; an attempt may have no endpoint.
+std::string Describe(const AttemptRecord& attempt) {
+  const std::string operation = NameOf(attempt.operation);
+  return attempt.endpoint.empty() ? operation : operation + " at " + attempt.endpoint;
 }
 
 // Such as "is slow by 90 s", to the nearest second.
@@ -68,9 +56,9 @@ std::string Compare(std::chrono::milliseconds offset) {
 class LogListener final : public AccessListener {
  public:
   void OnAttemptBegun(const AttemptRecord& attempt) override {
-    LogInternal(Logger(), kTraceLevel, "Source '%1': attempt %2 begun: %3 at %4, number %5%6",
-                {attempt.source, attempt.id, NameOf(attempt.operation), attempt.endpoint,
-                 attempt.number, attempt.isRefresh ? ", a refresh" : ""});
+    LogInternal(Logger(), kTraceLevel, "%1: attempt %2 begun: %3, number %4%5",
+                {SourceOf(attempt), attempt.id, Describe(attempt), attempt.number,
+                 attempt.isRefresh ? ", a refresh" : ""});
   }
 
   void OnAttemptEnded(const AttemptRecord& attempt) override {
@@ -78,15 +66,15 @@ class LogListener final : public AccessListener {
         std::chrono::duration_cast<std::chrono::milliseconds>(attempt.duration).count();
     const int level = LevelOf(attempt);
     if (attempt.failure == FailureKind::kNone) {
-      LogInternal(
-          Logger(), level, "Source '%1': attempt %2 has succeeded: %3 at %4 in %5 ms",
-          {attempt.source, attempt.id, NameOf(attempt.operation), attempt.endpoint, elapsed});
+      LogInternal(Logger(), level, "%1: attempt %2 has succeeded: %3 in %4 ms",
+                  {SourceOf(attempt), attempt.id, Describe(attempt), elapsed});
       return;
     }
-    LogInternal(Logger(), level,
-                "Source '%1': attempt %2 has failed: %3 at %4 in %5 ms, HTTP status %6: %7: %8",
-                {attempt.source, attempt.id, NameOf(attempt.operation), attempt.endpoint, elapsed,
-                 attempt.httpStatus, Access::NameOf(attempt.failure), attempt.message});
+    const std::string status =
+        attempt.httpStatus == 0 ? "" : ", HTTP status " + std::to_string(attempt.httpStatus);
+    LogInternal(Logger(), level, "%1: attempt %2 has failed: %3 in %4 ms%5: %6: %7",
+                {SourceOf(attempt), attempt.id, Describe(attempt), elapsed, status,
+                 NameOf(attempt.failure), attempt.message});
   }
 
   void OnRefreshFailed(const RefreshFailureRecord& refresh) override {
@@ -94,8 +82,8 @@ class LogListener final : public AccessListener {
     const std::string end = refresh.usableUntil
                                 ? "the token is usable until " + refresh.usableUntil->ToString()
                                 : std::string("there is no token");
-    LogInternal(Logger(), level, "Source '%1': refresh has failed, next one in %2 ms, %3: %4: %5",
-                {refresh.source, refresh.nextAttempt.count(), end, Access::NameOf(refresh.failure),
+    LogInternal(Logger(), level, "%1: refresh has failed, next one in %2 ms, %3: %4: %5",
+                {SourceOf(refresh), refresh.nextAttempt.count(), end, NameOf(refresh.failure),
                  refresh.message});
   }
 
@@ -104,32 +92,24 @@ class LogListener final : public AccessListener {
         circuit.state == CircuitState::kOpen
             ? ", next probe in " + std::to_string(circuit.retryAfter.count()) + " ms"
             : std::string();
-    LogInternal(Logger(), kWarningLevel, "Source '%1': circuit of %2 is %3%4",
-                {circuit.source, circuit.endpoint, NameOf(circuit.state), probe});
+    LogInternal(Logger(), kWarningLevel, "%1: circuit of %2 is %3%4",
+                {SourceOf(circuit), circuit.endpoint, NameOf(circuit.state), probe});
   }
 
   void OnClock(const ClockRecord& clock) override {
-    LogInternal(Logger(), kWarningLevel, "Source '%1': the clock of %2 %3",
-                {clock.source, clock.endpoint, Compare(clock.offset)});
+    LogInternal(Logger(), kWarningLevel, "%1: the clock of %2 %3",
+                {SourceOf(clock), clock.endpoint, Compare(clock.offset)});
   }
 
   void OnDeviation(const DeviationRecord& deviation) override {
     LogInternal(Logger(), kWarningLevel,
-                "Source '%1': %2 has issued a token with another %3 than asked: '%4' for '%5'",
-                {deviation.source, deviation.endpoint, deviation.field, deviation.issued,
+                "%1: %2 has issued a token with another %3 than asked: '%4' for '%5'",
+                {SourceOf(deviation), deviation.endpoint, deviation.field, deviation.issued,
                  deviation.requested});
   }
 };
 
 }  // namespace
-
-AccessListener::~AccessListener() = default;
-void AccessListener::OnAttemptBegun(const AttemptRecord&) {}
-void AccessListener::OnAttemptEnded(const AttemptRecord&) {}
-void AccessListener::OnRefreshFailed(const RefreshFailureRecord&) {}
-void AccessListener::OnCircuit(const CircuitRecord&) {}
-void AccessListener::OnClock(const ClockRecord&) {}
-void AccessListener::OnDeviation(const DeviationRecord&) {}
 
 std::shared_ptr<AccessListener> CreateLogListener() {
   return std::make_shared<LogListener>();

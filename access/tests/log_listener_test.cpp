@@ -64,6 +64,18 @@ TEST_F(LogListenerTest, FailuresAreAtLevelThreeAndRefusalsAtLevelTwo) {
                           "2" + text + "expired-password: No.", "6" + text + "abandoned: No."}));
 }
 
+TEST_F(LogListenerTest, WhatAnAttemptDoesNotHaveIsNotWritten) {
+  AttemptRecord attempt = Attempt(FailureKind::kSecretFailed);
+  attempt.source.clear();
+  attempt.endpoint.clear();
+  attempt.httpStatus = 0;
+  listener->OnAttemptBegun(attempt);
+  listener->OnAttemptEnded(attempt);
+  EXPECT_EQ(lines,
+            (Lines{"6 Source: attempt 7 begun: renewal, number 2",
+                   "3 Source: attempt 7 has failed: renewal in 120 ms: secret-failed: No."}));
+}
+
 TEST_F(LogListenerTest, RefreshesAndDeviationsAreWritten) {
   RefreshFailureRecord refresh;
   refresh.source = "orders";

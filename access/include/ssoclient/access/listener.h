@@ -21,6 +21,10 @@ enum class AttemptOperation {
   kExchange,  ///< a token by the token of another source
 };
 
+/// The name of the operation in lower case: "login", "renewal" or "exchange"; valid for the
+/// lifetime of the process.
+SSOCLIENT_ACCESS_EXPORT const char* NameOf(AttemptOperation operation) noexcept;
+
 /// One request, or one negotiation, at one endpoint; or a failed call of the function of a
 /// `PasswordLogin`, which no endpoint is chosen for.
 struct AttemptRecord {
@@ -45,6 +49,10 @@ enum class CircuitState {
   kOpen,      ///< none, until its next probe
   kHalfOpen,  ///< only the probe that is under way
 };
+
+/// The name of the state in lower case: "closed", "open" or "half-open"; valid for the lifetime of
+/// the process.
+SSOCLIENT_ACCESS_EXPORT const char* NameOf(CircuitState state) noexcept;
 
 /// An endpoint's circuit has changed.
 struct CircuitRecord {
