@@ -58,19 +58,22 @@ void PrintFailure(const Console& console, const Failure& failure) {
   }
 }
 
-void ReportFailure(const Console& console, const Registered& chosen, const Failure& failure) {
-  if (chosen.command->WantsJson()) {
-    Json error = {{"kind", failure.kind}, {"message", failure.message}};
-    if (!failure.remedy.empty()) {
-      error["remedy"] = failure.remedy;
-    }
-    PrintJson(console, chosen.subcommand->get_name(), failure.status, {{"error", error}});
-    return;
+// The command is empty if the command line names none.
+ExitStatus ReportFailure(const Console& console, const std::string& command, bool wantsJson,
+                         const Failure& failure) {
+  if (!wantsJson) {
+    PrintFailure(console, failure);
+    return failure.status;
   }
-  PrintFailure(console, failure);
+  Json error = {{"kind", failure.kind}, {"message", failure.message}};
+  if (!failure.remedy.empty()) {
+    error["remedy"] = failure.remedy;
+  }
+  PrintJson(console, command, failure.status, {{"error", error}});
+  return failure.status;
 }
 
-// The command line has no command, or it is not known which one.
+// The options of a wrong command line may not have been parsed.
 bool IsJsonWanted(int argc, const char* const* argv) {
   return std::any_of(argv, argv + argc,
                      [](const char* each) { return std::string_view(each) == "--json"; });
@@ -81,15 +84,8 @@ ExitStatus ReportUsage(const Console& console, const CLI::App& program, bool isJ
   const std::vector<CLI::App*> chosen = program.get_subcommands();
   const std::string name = chosen.empty() ? std::string() : chosen.front()->get_name();
   const std::string help = program.get_name() + (name.empty() ? "" : " " + name) + " --help";
-  const Failure failure{ExitStatus::kUsage, "usage", message, "see '" + help + "'"};
-  if (isJson) {
-    PrintJson(
-        console, name, failure.status,
-        {{"error", {{"kind", failure.kind}, {"message", message}, {"remedy", failure.remedy}}}});
-  } else {
-    PrintFailure(console, failure);
-  }
-  return failure.status;
+  return ReportFailure(console, name, isJson,
+                       {ExitStatus::kUsage, "usage", message, "see '" + help + "'"});
 }
 
 ExitStatus RunCommand(const Console& console, const Registered& chosen) {
@@ -101,9 +97,8 @@ ExitStatus RunCommand(const Console& console, const Registered& chosen) {
     }
     return outcome.status;
   } catch (const std::exception& exception) {
-    const Failure failure = FailureOf(exception);
-    ReportFailure(console, chosen, failure);
-    return failure.status;
+    return ReportFailure(console, chosen.subcommand->get_name(), chosen.command->WantsJson(),
+                         FailureOf(exception));
   }
 }
 

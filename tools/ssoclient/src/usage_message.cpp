@@ -30,11 +30,26 @@ std::string MessageWithoutCommand(int argc, const char* const* argv) {
                          : "there is no command '" + first + "'";
 }
 
-// Arguments that the command does not have.
-std::string MessageOfExtras(const std::vector<std::string>& extras) {
-  const auto option = std::find_if(extras.begin(), extras.end(), IsOption);
-  return option == extras.end() ? "there are more arguments than the command has"
-                                : "there is no option " + NameOfOption(*option);
+// Whether the command has the option, which is before its name in the arguments.
+bool IsBeforeCommand(const std::string& option, const CLI::App& command,
+                     const std::vector<std::string>& arguments) {
+  const auto end = std::find(arguments.begin(), arguments.end(), command.get_name());
+  return command.get_option_no_throw(option) != nullptr &&
+         std::any_of(arguments.begin(), end,
+                     [&](const std::string& each) { return NameOfOption(each) == option; });
+}
+
+// Arguments that the command does not have, or not there.
+std::string MessageOfExtras(const std::vector<std::string>& extras, const CLI::App& command,
+                            const std::vector<std::string>& arguments) {
+  const auto extra = std::find_if(extras.begin(), extras.end(), IsOption);
+  if (extra == extras.end()) {
+    return "there are more arguments than the command has";
+  }
+  const std::string option = NameOfOption(*extra);
+  return IsBeforeCommand(option, command, arguments)
+             ? option + " must follow the command: ssoclient " + command.get_name() + " " + option
+             : "there is no option " + option;
 }
 
 // Where the name is a word of the text, or npos.
@@ -158,7 +173,7 @@ std::string UsageMessage(const CLI::ParseError& error, const CLI::App& program, 
   // The library notices first what is missing, perhaps because an option was misspelt.
   const std::vector<std::string> extras = program.remaining(true);
   return Is<CLI::ExtrasError>(error) || std::any_of(extras.begin(), extras.end(), IsOption)
-             ? MessageOfExtras(extras)
+             ? MessageOfExtras(extras, *chosen.front(), {argv + 1, argv + argc})
              : MessageOf(error, *chosen.front());
 }
 

@@ -62,6 +62,9 @@ TEST(ProgramTest, AnUnknownOptionIsNamed) {
               HasSubstr("ssoclient: there is no option --password\n"));
   EXPECT_THAT(RunTool(Login({"before", "--other", "after"})).err,
               HasSubstr("ssoclient: there is no option --other\n"));
+  EXPECT_THAT(RunTool({"--json", "show", "x"}).Json()["error"]["message"].get<std::string>(),
+              HasSubstr("--json must follow the command: ssoclient show --json"));
+  EXPECT_THAT(RunTool({"--bogus", "show", "x"}).err, HasSubstr("there is no option --bogus\n"));
   EXPECT_THAT(RunTool({"show", "--bogus"}).err, HasSubstr("there is no option --bogus\n"));
   EXPECT_THAT(RunTool(Login({"-xyz"})).err, HasSubstr("ssoclient: there is no option -x\n"));
   EXPECT_THAT(RunTool(Login({"surplus"})).err,

@@ -5,6 +5,7 @@
 
 #include <ssoclient/saml_token_factory.h>
 #include <ssoclient/security_token_service.h>
+#include <tarnik/system/date_time.h>
 
 #include "commands/bound_token.h"
 #include "commands/commands.h"
@@ -20,6 +21,7 @@
 namespace SsoClient::Tool {
 namespace {
 
+using Tarnik::System::GetUtcDateTime;
 using Token = std::shared_ptr<const SamlToken>;
 
 class ExchangeCommand final : public Command {
@@ -42,7 +44,7 @@ CLI::App* ExchangeCommand::AddTo(CLI::App& program) {
       "Get another token for a token\n"
       "Asks the service for another token by a token that is bound to the key of --certificate: "
       "for other services (--audience), delegated to somebody (--delegate-to), or on behalf of "
-      "somebody else (--act-as). What is delegated, or acted with, must be a token that was "
+      "somebody else (--act-as). The token to delegate or to act with must have been "
       "obtained with --delegable.");
   SetExample(*command,
              "ssoclient exchange --url https://sts.example.com/sts --certificate me.pem \\\n"
@@ -86,7 +88,7 @@ Outcome ExchangeCommand::Run(const Console& console) {
   const Token own = ReadBoundToken(file_, mayBeOpen_, *signers, *setup.holderOfKey);
   const TokenSpec spec = request_.MakeSpec(mayBeOpen_);
   const Token token = Exchange(console, setup, own, spec);
-  const auto deviations = FindDeviations(*token, spec, request_.WantsBearer());
+  const auto deviations = FindDeviations(*token, spec, request_.WantsBearer(), GetUtcDateTime());
   return output_.Deliver(console, *token, deviations, WantsJson());
 }
 

@@ -5,6 +5,7 @@
 
 #include <ssoclient/saml_token_factory.h>
 #include <ssoclient/security_token_service.h>
+#include <tarnik/system/date_time.h>
 
 #include "commands/commands.h"
 #include "failure.h"
@@ -21,6 +22,7 @@
 namespace SsoClient::Tool {
 namespace {
 
+using Tarnik::System::GetUtcDateTime;
 using Token = std::shared_ptr<const SamlToken>;
 
 class LoginCommand final : public Command {
@@ -154,7 +156,8 @@ Outcome LoginCommand::Run(const Console& console) {
   // Only a login with nothing but the key binds a token on behalf of somebody to it.
   const bool isByKey = user_.empty() && !kerberos_.IsGiven();
   const bool isBearer = !key_.IsGiven() || request_.WantsBearer() || (spec.actAsToken && !isByKey);
-  return output_.Deliver(console, *token, FindDeviations(*token, spec, isBearer), WantsJson());
+  return output_.Deliver(console, *token, FindDeviations(*token, spec, isBearer, GetUtcDateTime()),
+                         WantsJson());
 }
 
 }  // namespace

@@ -6,6 +6,7 @@
 
 #include <ssoclient/saml_token_factory.h>
 #include <ssoclient/security_token_service.h>
+#include <tarnik/system/date_time.h>
 
 #include "commands/bound_token.h"
 #include "commands/commands.h"
@@ -22,6 +23,7 @@
 namespace SsoClient::Tool {
 namespace {
 
+using Tarnik::System::GetUtcDateTime;
 using Token = std::shared_ptr<const SamlToken>;
 
 class RenewCommand final : public Command {
@@ -98,7 +100,8 @@ Outcome RenewCommand::Run(const Console& console) {
   setup.holderOfKey = key_.Load(mayBeOpen_);
   const Token token = ReadBoundToken(file_, mayBeOpen_, *signers, *setup.holderOfKey);
   const Token renewed = Renew(console, setup, token, lifetimeSec_);
-  const auto deviations = FindDeviations(*renewed, SpecOf(*token, lifetimeSec_), false);
+  const auto deviations =
+      FindDeviations(*renewed, SpecOf(*token, lifetimeSec_), false, GetUtcDateTime());
   return output_.Deliver(console, *renewed, deviations, WantsJson());
 }
 

@@ -6,11 +6,11 @@
 #include <cstring>
 #include <future>
 #include <memory>
-#include <system_error>
 #include <thread>
 
 #include <netdb.h>
 
+#include "input/descriptor.h"
 #include "output/count_text.h"
 
 namespace SsoClient::Tool::Doctor {
@@ -51,11 +51,10 @@ Resolution ResolveBySystem(const std::string& host, int port) {
   addrinfo* list = nullptr;
   Resolution resolution;
   resolution.error = getaddrinfo(host.c_str(), std::to_string(port).c_str(), &hints, &list);
-  resolution.systemError = errno;
+  const int systemError = errno;
   if (resolution.error != 0) {
-    resolution.errorText = resolution.error == EAI_SYSTEM
-                               ? std::system_category().message(resolution.systemError)
-                               : gai_strerror(resolution.error);
+    resolution.errorText = resolution.error == EAI_SYSTEM ? SystemMessage(systemError)
+                                                          : gai_strerror(resolution.error);
     return resolution;
   }
   const std::unique_ptr<addrinfo, FreeAddresses> owner(list);

@@ -15,8 +15,7 @@ namespace SsoClient::Tool::Doctor {
 struct Resolution {
   std::vector<Address> addresses{};  ///< each once, in the resolver's order
   std::string errorText{};
-  int error = 0;        ///< of `getaddrinfo` (RFC 3493, section 6.1)
-  int systemError = 0;  ///< errno, if the error is EAI_SYSTEM
+  int error = 0;  ///< of `getaddrinfo` (RFC 3493, section 6.1)
   bool isTimedOut = false;
 };
 

@@ -21,6 +21,7 @@
 #include "doctor/tls_probe.h"
 #include "input/secret_text.h"
 #include "output/console.h"
+#include "service/service_address.h"
 
 namespace SsoClient::Tool::Doctor {
 
@@ -53,14 +54,6 @@ struct Plan {
   std::function<std::shared_ptr<NegotiationHandler>(const std::string& host)> makeKerberosHandler{};
 };
 
-/// The parts of the URL.
-struct Target {
-  std::string host{};
-  std::string path{};
-  int port = 0;
-  bool isHttps = false;
-};
-
 /// The answer to the harmless request.
 struct HttpAnswer {
   std::string reason{};
@@ -83,7 +76,7 @@ struct Examination {
   const Plan& plan;
   const Console& console;
   TimeLimit limit;
-  Target target{};
+  ServiceAddress service{};
   Tarnik::Ref<Tarnik::Ssl::SSLContext> sslContext{};
   std::vector<Tarnik::Ref<const Tarnik::Crypto::Certificate>> signers{};
   std::optional<HolderOfKeyConfig> identity{};
@@ -93,12 +86,10 @@ struct Examination {
   TlsAttempt tls{};
   std::optional<HttpAnswer> answer{};
   std::shared_ptr<const SamlToken> token{};
-  /// How far the clock of the service is ahead of this machine's, in seconds; 0 if unknown.
-  double clockOffset = 0;
 
   /// The name that the certificate of the service must have.
   const std::string& ExpectedName() const {
-    return plan.peerName.empty() ? target.host : plan.peerName;
+    return plan.peerName.empty() ? service.host : plan.peerName;
   }
 };
 

@@ -4,7 +4,6 @@
 #include <memory>
 
 #include <tarnik/core/checked_cast.h>
-#include <tarnik/http/connection_specs.h>
 #include <tarnik/ssl/ssl_exception.h>
 
 namespace SsoClient::Tool::Doctor {
@@ -22,11 +21,8 @@ LibraryVerdict VerdictOf(const Tarnik::Exception* failure) {
 }  // namespace
 
 Tarnik::Ref<Tarnik::Http::ConnectionSpec> MakeConnectionSpec(const Examination& examination) {
-  const Target& target = examination.target;
-  return target.isHttps ? Tarnik::Http::CreateTLSConnectionSpec(target.host, target.port,
-                                                                examination.sslContext.get(),
-                                                                examination.plan.peerName)
-                        : Tarnik::Http::CreateTCPConnectionSpec(target.host, target.port);
+  return Tool::MakeConnectionSpec(examination.service, examination.sslContext.get(),
+                                  examination.plan.peerName);
 }
 
 LibraryVerdict AskLibrary(const Examination& examination, TimeLimit::Clock::time_point end) {

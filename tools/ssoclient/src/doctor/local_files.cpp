@@ -1,11 +1,11 @@
 #include "doctor/local_files.h"
 
 #include <cerrno>
-#include <system_error>
 
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "input/descriptor.h"
 #include "output/count_text.h"
 
 namespace SsoClient::Tool::Doctor {
@@ -22,8 +22,7 @@ std::string Quoted(const std::string& path) {
 std::optional<Finding> FileProblem(const std::string& path) {
   struct stat status {};
   if (stat(path.c_str(), &status) != 0) {
-    return Failure(ExitStatus::kLocal, "file-missing",
-                   Quoted(path) + ": " + std::system_category().message(errno),
+    return Failure(ExitStatus::kLocal, "file-missing", Quoted(path) + ": " + SystemMessage(errno),
                    "check the path of the option");
   }
   if (S_ISDIR(status.st_mode)) {
@@ -32,8 +31,7 @@ std::optional<Finding> FileProblem(const std::string& path) {
   }
   if (access(path.c_str(), R_OK) != 0) {
     return Failure(ExitStatus::kLocal, "file-unreadable",
-                   Quoted(path) + ": " + std::system_category().message(errno),
-                   "let this user read the file");
+                   Quoted(path) + ": " + SystemMessage(errno), "let this user read the file");
   }
   return std::nullopt;
 }

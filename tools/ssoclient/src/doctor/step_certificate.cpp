@@ -59,7 +59,7 @@ void Compare(Step& step, const LibraryVerdict& verdict) {
 
 Step ExamineCertificate(Examination& examination) {
   Step step;
-  if (!examination.target.isHttps) {
+  if (!examination.service.isHttps) {
     step.finding = NotNeeded("the URL begins with http");
     return step;
   }

@@ -17,7 +17,6 @@ Step ExamineClock(Examination& examination) {
     return step;
   }
   const ClockOffset offset = OffsetOf(*date, answer.sentAt, answer.receivedAt);
-  examination.clockOffset = offset.seconds;
   step.finding = FindingOfClock(offset);
   step.details = {{"offsetSeconds", offset.seconds},
                   {"uncertaintySeconds", offset.uncertainty},

@@ -5,11 +5,11 @@ namespace SsoClient::Tool::Doctor {
 
 Step ExamineDns(Examination& examination) {
   Step step;
-  const Target& target = examination.target;
+  const ServiceAddress& service = examination.service;
   Resolution resolution =
-      ResolveUntil(ResolveBySystem, target.host, target.port, examination.limit.ForStep());
-  step.finding = FindingOfResolution(target.host, resolution);
-  step.details["host"] = target.host;
+      ResolveUntil(ResolveBySystem, service.host, service.port, examination.limit.ForStep());
+  step.finding = FindingOfResolution(service.host, resolution);
+  step.details["host"] = service.host;
   step.details["addresses"] = nlohmann::json::array();
   for (const Address& address : resolution.addresses) {
     step.lines.push_back(address.text);

@@ -35,7 +35,7 @@ HttpAnswer Exchange(const Examination& examination, TimeLimit::Clock::time_point
   const auto spec = MakeConnectionSpec(examination);
   const auto agent = Tarnik::Http::CreateHttpUserAgent(spec.get(), nullptr, nullptr);
   Tarnik::Ref<Tarnik::Http::ClientRequest> request;
-  Tarnik::Http::CreateHttpRequest(Tarnik::Http::Method::POST, examination.target.path, request);
+  Tarnik::Http::CreateHttpRequest(Tarnik::Http::Method::POST, examination.service.target, request);
   request->SetHeader("Content-Type", "text/xml");
   request->SetHeader("SOAPAction", std::string("\"") + kHarmlessAction + "\"");
   const auto sent = Tarnik::System::GetUtcDateTime();
@@ -80,9 +80,9 @@ Finding FindingOfTlsFailure(const Examination& examination, const std::string& m
 
 // Whether the service speaks TLS although the URL begins with http.
 bool SpeaksTls(const Examination& examination) {
-  return !examination.target.isHttps && TryTls(examination.reachable, examination.ExpectedName(),
-                                               TlsOffer::kLibrary, examination.limit.ForStep())
-                                            .isDone;
+  return !examination.service.isHttps && TryTls(examination.reachable, examination.ExpectedName(),
+                                                TlsOffer::kLibrary, examination.limit.ForStep())
+                                             .isDone;
 }
 
 Finding FindingOfFailure(const Examination& examination, const Tarnik::Exception& failure) {
@@ -127,8 +127,8 @@ Step ExamineHttp(Examination& examination) {
     return step;
   }
   const HttpAnswer& answer = *examination.answer;
-  step.finding = FindingOfHttp(answer, examination.target.path);
-  step.details = {{"httpStatus", answer.status}, {"path", examination.target.path}};
+  step.finding = FindingOfHttp(answer, examination.service.target);
+  step.details = {{"httpStatus", answer.status}, {"path", examination.service.target}};
   const std::pair<const char*, const std::string*> fields[] = {{"contentType", &answer.contentType},
                                                                {"location", &answer.location},
                                                                {"server", &answer.server}};

@@ -89,10 +89,8 @@ class Login {
 
  private:
   ServiceSetup MakeSetup() const {
-    const Target& target = examination_.target;
     ServiceSetup setup;
-    setup.address = {
-        .host = target.host, .target = target.path, .port = target.port, .isHttps = target.isHttps};
+    setup.address = examination_.service;
     setup.peerName = examination_.plan.peerName;
     setup.sslContext = examination_.sslContext;
     setup.tokenFactory = factory_;
@@ -130,7 +128,7 @@ class Login {
 
   Operation ByKerberos() {
     handler_ = std::make_shared<NotingHandler>(
-        examination_.plan.makeKerberosHandler(examination_.target.host));
+        examination_.plan.makeKerberosHandler(examination_.service.host));
     return [handler = handler_](const SecurityTokenService& service) {
       return service.AcquireTokenByGSS(MakeSpec(), *handler);
     };
@@ -163,11 +161,11 @@ Step ExamineLogin(Examination& examination) {
     step.finding = NotNeeded("no login was asked for: --user, --certificate or --kerberos");
     return step;
   }
-  if (!examination.target.isHttps && !examination.plan.isHttpAllowed) {
-    step.finding =
-        Failure(ExitStatus::kUsage, "plain-http",
-                "over http, everybody on the way can read passwords and tokens: no login was sent",
-                "use an https URL, or accept this with --allow-http");
+  if (!examination.service.isHttps && !examination.plan.isHttpAllowed) {
+    step.finding = Failure(
+        ExitStatus::kUsage, "plain-http",
+        "over http, anyone on the network path can read passwords and tokens: no login was sent",
+        "use an https URL, or accept this with --allow-http");
     return step;
   }
   Login login(examination);

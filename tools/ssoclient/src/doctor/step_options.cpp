@@ -1,5 +1,4 @@
 #include <tarnik/core/exception.h>
-#include <tarnik/http/http_url.h>
 
 #include "doctor/steps.h"
 
@@ -9,21 +8,21 @@ namespace {
 constexpr int kHttpPort = 80;
 constexpr int kHttpsPort = 443;
 
-Finding FindingOfUrl(const Plan& plan, const Target& target) {
-  if (!target.isHttps && target.port == kHttpsPort) {
+Finding FindingOfUrl(const Plan& plan, const ServiceAddress& service) {
+  if (!service.isHttps && service.port == kHttpsPort) {
     return Warning(ExitStatus::kUsage, "http-with-https-port",
                    "the URL begins with http, but 443 is the port of https",
                    "write https:// in the URL");
   }
-  if (target.isHttps && target.port == kHttpPort) {
+  if (service.isHttps && service.port == kHttpPort) {
     return Warning(ExitStatus::kUsage, "https-with-http-port",
                    "the URL begins with https, but 80 is the port of http",
                    "check the port of the URL");
   }
-  if (!target.isHttps) {
+  if (!service.isHttps) {
     return Warning(ExitStatus::kUsage, "http-url",
                    "the URL begins with http: passwords and tokens are sent unencrypted",
-                   "use https, except on the machine of the service");
+                   "use https, unless the service runs on this machine");
   }
   return Fine(plan.peerName.empty()
                   ? "the URL is well-formed"
@@ -34,20 +33,19 @@ Finding FindingOfUrl(const Plan& plan, const Target& target) {
 
 Step ExamineOptions(Examination& examination) {
   Step step;
-  Target& target = examination.target;
+  ServiceAddress& service = examination.service;
   try {
-    Tarnik::Http::ParseHttpURL(examination.plan.url, target.isHttps, target.host, target.port,
-                               target.path);
+    service = ParseServiceAddress(examination.plan.url);
   } catch (const Tarnik::InvalidArgumentException& malformed) {
     step.finding = Failure(ExitStatus::kUsage, "bad-url", malformed.what(),
                            "write the URL as https://HOST[:PORT]/PATH");
     return step;
   }
-  step.finding = FindingOfUrl(examination.plan, target);
-  step.details = {{"scheme", target.isHttps ? "https" : "http"},
-                  {"host", target.host},
-                  {"port", target.port},
-                  {"path", target.path}};
+  step.finding = FindingOfUrl(examination.plan, service);
+  step.details = {{"scheme", service.isHttps ? "https" : "http"},
+                  {"host", service.host},
+                  {"port", service.port},
+                  {"path", service.target}};
   return step;
 }
 

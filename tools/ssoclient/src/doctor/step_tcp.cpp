@@ -1,8 +1,7 @@
-#include <system_error>
-
 #include "doctor/steps.h"
 #include "doctor/tcp_findings.h"
 #include "doctor/tcp_probe.h"
+#include "input/descriptor.h"
 
 namespace SsoClient::Tool::Doctor {
 
@@ -14,8 +13,7 @@ Step ExamineTcp(Examination& examination) {
   for (const TcpAttempt& attempt : attempts) {
     connections.push_back({attempt.error, attempt.address.IsIpv6()});
     const bool isConnected = attempt.error == 0;
-    const std::string result =
-        isConnected ? "connected" : std::system_category().message(attempt.error);
+    const std::string result = isConnected ? "connected" : SystemMessage(attempt.error);
     const auto milliseconds = static_cast<double>(attempt.duration.count()) / 1000;
     step.lines.push_back(attempt.address.text + ": " + result);
     step.details["connections"].push_back({{"address", attempt.address.text},
@@ -26,7 +24,7 @@ Step ExamineTcp(Examination& examination) {
       examination.reachable = attempt.address;
     }
   }
-  step.finding = FindingOfConnections(connections, examination.target.port);
+  step.finding = FindingOfConnections(connections, examination.service.port);
   return step;
 }
 

@@ -27,7 +27,7 @@ void AskFurther(const Examination& examination, TlsFacts& facts) {
     return;
   }
   if (facts.alert < 0) {
-    facts.plainAnswer = TryPlainHttp(address, examination.target.host, end);
+    facts.plainAnswer = TryPlainHttp(address, examination.service.host, end);
   }
   if (IsHttp(facts.plainAnswer)) {
     return;
@@ -42,7 +42,7 @@ void AskFurther(const Examination& examination, TlsFacts& facts) {
 
 Step ExamineTls(Examination& examination) {
   Step step;
-  if (!examination.target.isHttps) {
+  if (!examination.service.isHttps) {
     step.finding = NotNeeded("the URL begins with http");
     return step;
   }
@@ -53,7 +53,7 @@ Step ExamineTls(Examination& examination) {
   if (!tls.isDone && tls.isConnected && !tls.isTimedOut) {
     AskFurther(examination, facts);
   }
-  step.finding = FindingOfTls(facts, examination.target.port);
+  step.finding = FindingOfTls(facts, examination.service.port);
   if (tls.isDone) {
     step.details = {{"protocol", tls.protocol},
                     {"cipher", tls.cipher},

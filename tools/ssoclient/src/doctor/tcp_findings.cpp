@@ -2,8 +2,8 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <system_error>
 
+#include "input/descriptor.h"
 #include "output/count_text.h"
 
 namespace SsoClient::Tool::Doctor {
@@ -29,7 +29,7 @@ Finding FindingOfFailure(const Connection& first, bool isOnlyIpv6, int port) {
     case ECONNREFUSED:
       return Failure(ExitStatus::kUnreachable, "refused",
                      "the host refuses connections to " + where,
-                     "check that the service runs and that the URL has its port");
+                     "check that the service runs and that the port in the URL is right");
     case ETIMEDOUT:
       return Failure(ExitStatus::kUnreachable, "tcp-timed-out",
                      "nothing answers at " + where +
@@ -40,10 +40,9 @@ Finding FindingOfFailure(const Connection& first, bool isOnlyIpv6, int port) {
                      "a router says that the host cannot be reached",
                      "check that the host is up, and the firewalls on the way");
     default:
-      return Failure(
-          ExitStatus::kUnreachable, "tcp-failed",
-          "no connection to " + where + ": " + std::system_category().message(first.error),
-          "check the network and the limits of this machine");
+      return Failure(ExitStatus::kUnreachable, "tcp-failed",
+                     "no connection to " + where + ": " + SystemMessage(first.error),
+                     "check the network and the limits of this machine");
   }
 }
 

@@ -22,8 +22,8 @@ Finding NotTls(const TlsFacts& facts, const std::string& where) {
   if (IsHttp(facts.firstOctets) || IsHttp(facts.plainAnswer)) {
     return Failure(ExitStatus::kUnreachable, "http-on-https-port",
                    where + " speaks plain HTTP, not TLS",
-                   "use the https port of the service, or http:// in the URL on the machine of "
-                   "the service");
+                   "use the https port of the service, or an http URL if the service runs on this "
+                   "machine");
   }
   return Failure(ExitStatus::kUnreachable, "not-tls",
                  where + " does not speak TLS; it sends '" + FirstLine(facts.firstOctets) + "'",

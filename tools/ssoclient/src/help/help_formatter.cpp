@@ -20,7 +20,7 @@ constexpr std::string_view kExitStatus =
     "  1  the service refused the request, or a check refused the token\n"
     "  2  the command line is wrong\n"
     "  3  no usable answer: the network, TLS, HTTP, a time-out or a broken answer\n"
-    "  4  a file, a key, a secret or a resource of this machine\n";
+    "  4  a local problem: a file, a key, a secret or a resource of this machine\n";
 
 std::string Paragraph(std::string_view text, std::size_t indent) {
   std::string result;

@@ -1,8 +1,6 @@
 #include "input/private_file.h"
 
-#include <array>
 #include <cerrno>
-#include <utility>
 
 #include <CLI/CLI.hpp>
 #include <fcntl.h>
@@ -16,6 +14,16 @@
 
 namespace SsoClient::Tool {
 namespace {
+
+// A buffer that is overwritten at its end.
+struct CleansedBuffer {
+  explicit CleansedBuffer(std::size_t size) : octets(size, '\0') {}
+  ~CleansedBuffer() { Tarnik::StringUtil::Cleanse(octets); }
+  CleansedBuffer(const CleansedBuffer&) = delete;
+  CleansedBuffer& operator=(const CleansedBuffer&) = delete;
+
+  std::string octets;
+};
 
 [[noreturn]] void Fail(const std::string& what, const std::string& message,
                        const std::string& remedy = "") {
@@ -101,21 +109,18 @@ SecretText ReadDescriptor(int descriptor, const std::string& name, const std::st
                           std::size_t maxBytes) {
   constexpr std::size_t kAtOnce = std::size_t{64} * 1024;
   SecretText content;
-  std::string buffer(kAtOnce, '\0');
+  CleansedBuffer buffer(kAtOnce);
   for (;;) {
-    const ssize_t size =
-        RetryInterrupted([&] { return read(descriptor, buffer.data(), buffer.size()); });
-    if (size <= 0) {
-      const int error = errno;
-      Tarnik::StringUtil::Cleanse(buffer);
-      if (size < 0) {
-        Fail(what, "cannot read " + name + ": " + SystemMessage(error));
-      }
+    const ssize_t size = RetryInterrupted(
+        [&] { return read(descriptor, buffer.octets.data(), buffer.octets.size()); });
+    if (size < 0) {
+      Fail(what, "cannot read " + name + ": " + SystemMessage(errno));
+    }
+    if (size == 0) {
       return content;
     }
-    content.Append(buffer.data(), static_cast<std::size_t>(size));
+    content.Append(buffer.octets.data(), static_cast<std::size_t>(size));
     if (content.Text().size() > maxBytes) {
-      Tarnik::StringUtil::Cleanse(buffer);
       Fail(what, name + " is larger than " + std::to_string(maxBytes) + " bytes");
     }
   }

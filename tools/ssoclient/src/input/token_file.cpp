@@ -46,6 +46,9 @@ void CheckDestination(const std::string& path) {
   if (S_ISLNK(status.st_mode)) {
     FailToWrite(path, "it is a symbolic link", "name the file that it refers to");
   }
+  if (S_ISDIR(status.st_mode)) {
+    FailToWrite(path, "it is a folder", "name a file in the folder");
+  }
   if (!S_ISREG(status.st_mode)) {
     FailToWrite(path, "it is not a regular file", "use '--output -' and redirect standard output");
   }

@@ -7,19 +7,13 @@
 #include <tarnik/core/ref.h>
 #include <tarnik/ssl/ssl_context.h>
 
+#include "service/service_address.h"
+
 namespace CLI {
 class App;
 }
 
 namespace SsoClient::Tool {
-
-/// The parts of a service's URL.
-struct ServiceAddress {
-  std::string host{};    ///< a name or an address, without brackets
-  std::string target{};  ///< path and query
-  int port = 0;
-  bool isHttps = false;
-};
 
 /// Where the service is, and how it is trusted. The options are the same in all commands.
 struct ConnectionOptions {

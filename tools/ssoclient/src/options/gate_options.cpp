@@ -84,7 +84,9 @@ void GateOptions::AddTrustTo(CLI::App& command) {
                   std::string(kTrustVariable))
       ->type_name("PATH")
       ->group("Trust");
-  command.add_option("--issuer", issuer_, "The only issuer that --sts-certificate is for")
+  command
+      .add_option("--issuer", issuer_,
+                  "Trust the certificates of --sts-certificate for this issuer only")
       ->type_name("NAME")
       ->group("Trust");
   command
@@ -159,8 +161,8 @@ void GateOptions::AddLimitsTo(CLI::App& command) {
       ->group("Limit");
   command
       .add_option("--at", time_,
-                  "Check as if it were this time, such as 2026-11-22T16:30:00Z: the trust and "
-                  "the revocation lists are those of now")
+                  "Check as if it were this time, such as 2026-11-22T16:30:00Z; certificates and "
+                  "revocation lists are still the current ones")
       ->type_name("DATETIME")
       ->check(CheckTimeText)
       ->group("Limit");

@@ -21,10 +21,6 @@ class KerberosOptions {
   CLI::Option* AddTo(CLI::App& command, const std::string& group);
 
   bool IsGiven() const { return isGiven_; }
-  /// The values of the options, which may be empty.
-  const std::string& Service() const { return service_; }
-  const std::string& Principal() const { return principal_; }
-  const std::string& CredentialCache() const { return credentialCache_; }
   /// The path of the keytab, which may be empty.
   std::string Keytab() const;
 

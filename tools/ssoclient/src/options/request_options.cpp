@@ -50,7 +50,7 @@ void RequestOptions::AddConfirmationTo(CLI::App& command) {
       "--bearer", isBearer_, "Ask for a token that is not bound to the key of --certificate");
   command
       .add_flag("--holder-of-key", isHolderOfKey_,
-                "Ask for a token that is bound to the key of --certificate, as without an option")
+                "Ask for a token that is bound to the key of --certificate (the default)")
       ->excludes(bearer);
 }
 

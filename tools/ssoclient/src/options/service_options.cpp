@@ -61,7 +61,7 @@ ServiceSetup ServiceOptions::MakeSetup() const {
     setup.sslContext = connection_.MakeSslContext();
   } else if (!isHttpAllowed_) {
     throw ToolException({ExitStatus::kUsage, "plain-http",
-                         "over http, everybody on the way can read passwords and tokens",
+                         "over http, anyone on the network path can read passwords and tokens",
                          "use an https URL, or accept this with --allow-http"});
   }
   return setup;
@@ -69,8 +69,9 @@ ServiceSetup ServiceOptions::MakeSetup() const {
 
 void AddHttpOption(CLI::App& command, bool& isAllowed) {
   command
-      .add_flag("--allow-http", isAllowed,
-                "Accept an http URL, over which everybody on the way can read passwords and tokens")
+      .add_flag(
+          "--allow-http", isAllowed,
+          "Accept an http URL, over which anyone on the network path can read passwords and tokens")
       ->group("Connection");
 }
 

@@ -7,6 +7,7 @@
 
 #include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>
+#include <tarnik/system/date_time.h>
 
 #include "commands/command.h"
 #include "output/console.h"
@@ -24,9 +25,11 @@ struct Deviation {
   std::string issued{};     ///< for people
 };
 
-/// The fields of a token that was issued just now that differ from `spec`; lifetimes by more than a
-/// hundredth and two seconds.
-std::vector<Deviation> FindDeviations(const SamlToken& token, const TokenSpec& spec, bool isBearer);
+/// The fields of a token that differ from `spec`, in what was issued at `now`. The lifetime differs
+/// if neither the time from the start nor that from `now` is the requested one, by more than a
+/// hundredth and two seconds: a service may set the start back, and clocks may differ.
+std::vector<Deviation> FindDeviations(const SamlToken& token, const TokenSpec& spec, bool isBearer,
+                                      const Tarnik::System::DateTime& now);
 
 /// Where a command writes the token that it has received.
 class TokenOutput {

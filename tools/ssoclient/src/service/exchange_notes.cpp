@@ -21,7 +21,6 @@ class NotingUserAgent final : public Tarnik::Http::UserAgent, public Tarnik::Obj
 
   Ref<PendingRequestItem> SendAsync(Tarnik::Http::ClientRequest* request, Completion completion,
                                     unsigned long timeoutMicroseconds) override {
-    notes_->hasSent = true;
     return inner_->SendAsync(request, std::move(completion), timeoutMicroseconds);
   }
 

@@ -18,7 +18,6 @@ struct ExchangeNotes {
   /// The service's clock minus this system's in seconds, by the last answer with a Date.
   std::optional<long> clockOffsetSec{};
   int httpStatus = 0;  ///< of the last answer; 0 without one
-  bool hasSent = false;
 };
 
 /// An agent that sends by `inner` and writes to `notes` how exchanges end. It is used by one thread

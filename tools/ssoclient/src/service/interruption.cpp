@@ -1,6 +1,7 @@
 #include "service/interruption.h"
 
-#include <cstdlib>
+#include <cerrno>
+#include <system_error>
 
 #include <sys/signalfd.h>
 #include <unistd.h>
@@ -9,6 +10,14 @@ namespace SsoClient::Tool {
 namespace {
 
 constexpr int kSignalStatus = 128;
+
+Descriptor ArrivalsOf(const sigset_t& signals) {
+  Descriptor arrivals(signalfd(-1, &signals, SFD_CLOEXEC | SFD_NONBLOCK));
+  if (arrivals.Get() < 0) {
+    throw std::system_error(errno, std::generic_category(), "cannot wait for signals");
+  }
+  return arrivals;
+}
 
 sigset_t SignalsToHold() {
   sigset_t signals;
@@ -24,8 +33,7 @@ sigset_t SignalsToHold() {
 
 }  // namespace
 
-Interruption::Interruption()
-    : held_(SignalsToHold()), arrivals_(signalfd(-1, &held_, SFD_CLOEXEC | SFD_NONBLOCK)) {
+Interruption::Interruption() : held_(SignalsToHold()), arrivals_(ArrivalsOf(held_)) {
   pthread_sigmask(SIG_BLOCK, &held_, &before_);
 }
 

@@ -11,6 +11,7 @@ namespace SsoClient::Tool {
 /// and those that it starts, while it exists. Signals that the process ignores stay ignored.
 class Interruption {
  public:
+  /// Throws `std::system_error` when no descriptor is left.
   Interruption();
   ~Interruption();
   Interruption(const Interruption&) = delete;

@@ -65,8 +65,10 @@ std::string Unescaped(std::string_view text) {
   std::string result;
   result.reserve(text.size());
   while (!text.empty()) {
-    const std::size_t end = text.front() == '&' ? text.find(';') : std::string_view::npos;
-    const auto code = end <= kLongestReference ? CodeOf(text.substr(1, end - 1)) : std::nullopt;
+    const std::string_view start = text.substr(0, kLongestReference + 1);
+    const std::size_t end = text.front() == '&' ? start.find(';') : std::string_view::npos;
+    const auto code =
+        end == std::string_view::npos ? std::nullopt : CodeOf(text.substr(1, end - 1));
     if (code) {
       AppendUtf8(result, *code);
       text.remove_prefix(end + 1);

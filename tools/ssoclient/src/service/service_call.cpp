@@ -8,7 +8,7 @@
 #include <cmath>
 #include <cstdint>
 #include <exception>
-#include <utility>
+#include <system_error>
 
 #include <poll.h>
 #include <sys/eventfd.h>
@@ -16,7 +16,6 @@
 
 #include <ssoclient/security_token_service_config.h>
 #include <tarnik/http/bounded_user_agent.h>
-#include <tarnik/http/connection_specs.h>
 #include <tarnik/http/cookie_store.h>
 #include <tarnik/http/http_user_agent.h>
 #include <tarnik/system/thread_pool.h>
@@ -53,7 +52,11 @@ struct Call {
   Descriptor ended;
   std::atomic<bool> hasEnded = false;
 
-  Call() : notes(std::make_shared<ExchangeNotes>()), ended(eventfd(0, EFD_CLOEXEC)) {}
+  Call() : notes(std::make_shared<ExchangeNotes>()), ended(eventfd(0, EFD_CLOEXEC)) {
+    if (ended.Get() < 0) {
+      throw std::system_error(errno, std::generic_category(), "cannot wait for the service");
+    }
+  }
 
   void Run() {
     try {
@@ -68,11 +71,7 @@ struct Call {
 };
 
 Ref<Tarnik::Http::UserAgent> MakeUserAgent(const ServiceSetup& setup, Call& call) {
-  const ServiceAddress& address = setup.address;
-  const Ref<Tarnik::Http::ConnectionSpec> spec =
-      address.isHttps ? Tarnik::Http::CreateTLSConnectionSpec(
-                            address.host, address.port, setup.sslContext.get(), setup.peerName)
-                      : Tarnik::Http::CreateTCPConnectionSpec(address.host, address.port);
+  const auto spec = MakeConnectionSpec(setup.address, setup.sslContext.get(), setup.peerName);
   // The legs of a negotiation belong together by cookies.
   const auto cookies = Tarnik::Http::CreateCookieStore("");
   const auto agent = Tarnik::Http::CreateHttpUserAgent(spec.get(), cookies.get(), nullptr);

@@ -15,8 +15,8 @@
 #include <tarnik/core/ref.h>
 #include <tarnik/ssl/ssl_context.h>
 
-#include "options/connection_options.h"
 #include "output/console.h"
+#include "service/service_address.h"
 
 namespace SsoClient::Tool {
 

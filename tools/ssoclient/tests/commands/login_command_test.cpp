@@ -102,6 +102,15 @@ TEST_F(LoginCommandTest, SaysWhatIsNotAsAskedFor) {
   EXPECT_EQ(json["deviations"][1]["field"], "renewable");
 }
 
+TEST_F(LoginCommandTest, AStartThatIsSetBackIsNotAnotherLifetime) {
+  DevSts::AssertionOptions options;
+  options.notBeforeOffset = std::chrono::minutes(5);
+  Sts().SetAssertionOptions(options);
+  const nlohmann::json json = RunTool(PasswordLogin({"--json", "-o", PathOf("token")})).Json();
+  EXPECT_EQ(json["token"]["lifetime"], 3600 + 300);
+  EXPECT_EQ(json["deviations"], nlohmann::json::array());
+}
+
 TEST_F(LoginCommandTest, AKeyGivesATokenThatIsBoundToIt) {
   const nlohmann::json json = RunTool(KeyLogin({"--json", "-o", PathOf("token")})).Json();
   EXPECT_EQ(json["token"]["subject"]["name"], "machine");

@@ -137,9 +137,13 @@ TEST_F(TerminalTest, OtherProcessesDoNotSeeThePassword) {
   const std::string folder = "/proc/" + std::to_string(tool.Id());
   EXPECT_THAT(Content(folder + "/cmdline"), HasSubstr("alice"));
   EXPECT_THAT(Content(folder + "/cmdline"), Not(HasSubstr("secret")));
-  // Others than root cannot even read it.
-  EXPECT_THAT(Content(folder + "/environ"), HasSubstr(geteuid() == 0 ? "TERM=xterm" : ""));
-  EXPECT_THAT(Content(folder + "/environ"), Not(HasSubstr("secret")));
+  const std::string environment = Content(folder + "/environ");
+  if (geteuid() == 0) {
+    EXPECT_THAT(environment, HasSubstr("TERM=xterm"));
+    EXPECT_THAT(environment, Not(HasSubstr("secret")));
+  } else {
+    EXPECT_EQ(environment, "");  // only root may read it
+  }
 }
 
 TEST_F(TerminalTest, ALongWaitShowsItsStageAndCtrlCEndsIt) {
@@ -149,7 +153,7 @@ TEST_F(TerminalTest, ALongWaitShowsItsStageAndCtrlCEndsIt) {
   ToolOptions options = Login();
   options.arguments = PasswordLogin({"-o", PathOf("token")});
   ToolProcess tool(options);
-  ASSERT_TRUE(tool.WaitFor("waiting for the answer (2 s of 30 s)"));
+  ASSERT_TRUE(tool.WaitFor("waiting for the answer (") && tool.WaitFor(" s of 30 s)"));
   tool.Type("\x03");
   const ToolResult result = tool.Finish();
   EXPECT_EQ(result.signal, SIGINT);

@@ -24,6 +24,12 @@ std::string WithScheme(const std::string& scheme, const std::string& url) {
   return scheme + url.substr(url.find(':'));
 }
 
+// Runs doctor with little time and one CA, whose file is read quickly, unlike those of the system.
+DoctorRun RunBriefly(const std::string& url) {
+  const TemporaryFile ca(Tarnik::Testing::MakeCa("CA").Pem());
+  return RunDoctor(url, {"--timeout", "1.5", "--ca", ca.Path()});
+}
+
 TEST(DoctorTlsTest, PlainHttpOnTheHttpsPortIsFound) {
   const DevSts::Server sts;
   ExpectFailure(RunDoctor(WithScheme("https", sts.HttpUrl())), "tls", "http-on-https-port", 3,
@@ -47,8 +53,8 @@ TEST(DoctorTlsTest, AnotherProtocolIsFoundAndShown) {
 
 TEST(DoctorTlsTest, ASilentServiceTakesOnlyAThirdOfTheTime) {
   const Peer silent(Silent());
-  ExpectFailure(RunDoctor(silent.Url(), {"--timeout", "0.9"}), "tls", "tls-timed-out", 3,
-                "certificate");
+  const DoctorRun run = RunBriefly(silent.Url());
+  ExpectFailure(run, "tls", "tls-timed-out", 3, "certificate");
 }
 
 TEST(DoctorTlsTest, AServiceThatEndsConnectionsIsFound) {
@@ -59,8 +65,8 @@ TEST(DoctorTlsTest, AServiceThatEndsConnectionsIsFound) {
 TEST(DoctorTlsTest, AServiceThatAcceptsOnlyOneConnectionIsFound) {
   // The connection of the TCP step stays in the queue, which has room for one.
   const ListeningSocket full(0);
-  ExpectFailure(RunDoctor(full.Url(), {"--timeout", "0.9"}), "tls", "tls-no-connection", 3,
-                "certificate");
+  const DoctorRun run = RunBriefly(full.Url());
+  ExpectFailure(run, "tls", "tls-no-connection", 3, "certificate");
 }
 
 TEST(DoctorTlsTest, AServiceWhoseTlsBreaksLaterIsFound) {

@@ -1,5 +1,7 @@
 #include "service/secret_search.h"
 
+#include <cstddef>
+#include <ctime>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -24,6 +26,14 @@ TEST(SecretSearchTest, OtherTextsDoNotContainIt) {
   EXPECT_FALSE(ContainsSecret("& &; &#; &#xZ; &lt", "secret"));
   EXPECT_FALSE(ContainsSecret("anything", ""));
   EXPECT_FALSE(ContainsSecret("", "secret"));
+}
+
+TEST(SecretSearchTest, TheTimeGrowsWithTheLengthOnly) {
+  // Searching each ampersand's semicolon to the end of the text would take minutes.
+  const std::string text(std::size_t{4} * 1024 * 1024, '&');
+  const std::clock_t begin = std::clock();
+  EXPECT_FALSE(ContainsSecret(text, "secret"));
+  EXPECT_LT(std::clock() - begin, 20 * CLOCKS_PER_SEC);
 }
 
 }  // namespace

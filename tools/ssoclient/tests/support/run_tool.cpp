@@ -141,6 +141,9 @@ void Report(const Plan& plan, int value) {
   if (job == 0) {
     RunJob(plan);
   }
+  if (job < 0) {
+    _exit(1);
+  }
   close_range(0, static_cast<unsigned>(plan.statuses) - 1, 0);
   close_range(static_cast<unsigned>(plan.statuses) + 1, ~0U, 0);
   Report(plan, job);
@@ -238,11 +241,15 @@ ToolProcess::ToolProcess(const ToolOptions& options) {
     Pump(100);
     process_ = NextStatus().value_or(-1);
   }
+  if (!(process_ > 0)) {
+    Finish();
+    throw std::runtime_error("the tool was not started");
+  }
 }
 
 ToolProcess::~ToolProcess() {
   if (leader_ > 0) {
-    kill(process_, SIGKILL);
+    Signal(SIGKILL);
     Finish();
   }
 }
@@ -312,7 +319,10 @@ void ToolProcess::Type(const std::string& text) {
 }
 
 void ToolProcess::Signal(int signal) const {
-  kill(process_, signal);
+  // Other numbers would be groups of processes, or all of them.
+  if (process_ > 0) {
+    kill(process_, signal);
+  }
 }
 
 std::optional<int> ToolProcess::NextStatus() {
@@ -354,7 +364,7 @@ ToolResult ToolProcess::Finish(std::chrono::milliseconds limit) {
   // Each source ends when the tool and the leader have ended.
   while (std::any_of(sources_.begin(), sources_.end(), isOpen)) {
     if (std::chrono::steady_clock::now() >= end) {
-      kill(process_, SIGKILL);
+      Signal(SIGKILL);
     }
     Pump(100);
   }
