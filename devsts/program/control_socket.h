@@ -22,6 +22,9 @@ namespace DevSts::Program {
 // Throws FileError if the path is too long for the address of a socket.
 sockaddr_un AddressOf(const std::string& path);
 
+// Sends the line. Ignores errors: the peer may end the connection before it has read everything.
+void SendLine(int socket, const std::string& line);
+
 // A Unix socket with which several clients at once send commands, one in a line, and receive one
 // line in answer to each. Only the owner of the process can connect.
 class ControlSocket {
