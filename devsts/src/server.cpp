@@ -24,9 +24,6 @@ struct TlsIdentity {
 
 namespace {
 
-// Long enough that clients do not warn that a certificate expires soon.
-constexpr std::chrono::hours kCertificateLifetime{90 * 24};
-
 bool IsGiven(const Credential& credential) {
   return !credential.certificatePem.empty();
 }
