@@ -15,7 +15,7 @@
 #include <sys/un.h>
 
 #include "commands.h"
-#include "files.h"
+#include "descriptor.h"
 
 namespace DevSts::Program {
 
