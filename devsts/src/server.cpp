@@ -3,7 +3,6 @@
 #include <iostream>
 #include <memory>
 #include <mutex>
-#include <stdexcept>
 #include <utility>
 
 #include "operations/service.h"
