@@ -8,8 +8,8 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include "descriptor.h"
 #include "errors.h"
-#include "files.h"
 
 namespace DevSts::Program {
 namespace {

@@ -27,18 +27,6 @@ Descriptor ConnectTo(const std::string& path) {
   return connection;
 }
 
-// The service may end the connection before it has read everything, after an error.
-void SendLine(int connection, const std::string& line) {
-  const std::string text = line + "\n";
-  for (std::size_t at = 0; at < text.size();) {
-    const ssize_t size = send(connection, text.data() + at, text.size() - at, MSG_NOSIGNAL);
-    if (size <= 0) {
-      return;
-    }
-    at += static_cast<std::size_t>(size);
-  }
-}
-
 std::string ReadLine(int connection) {
   std::array<char, 4096> octets{};
   std::string text;

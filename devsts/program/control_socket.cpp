@@ -58,17 +58,6 @@ Descriptor ListenAt(const std::string& path) {
   return listener;
 }
 
-void Answer(int socket, const std::string& line) {
-  const std::string text = line + "\n";
-  for (std::size_t at = 0; at < text.size();) {
-    const ssize_t size = send(socket, text.data() + at, text.size() - at, MSG_NOSIGNAL);
-    if (size <= 0) {
-      return;
-    }
-    at += static_cast<std::size_t>(size);
-  }
-}
-
 }  // namespace
 
 sockaddr_un AddressOf(const std::string& path) {
@@ -80,6 +69,17 @@ sockaddr_un AddressOf(const std::string& path) {
   }
   path.copy(address.sun_path, path.size());
   return address;
+}
+
+void SendLine(int socket, const std::string& line) {
+  const std::string text = line + "\n";
+  for (std::size_t at = 0; at < text.size();) {
+    const ssize_t size = send(socket, text.data() + at, text.size() - at, MSG_NOSIGNAL);
+    if (size <= 0) {
+      return;
+    }
+    at += static_cast<std::size_t>(size);
+  }
 }
 
 ControlSocket::ControlSocket(std::string path) : path_(std::move(path)) {
@@ -145,7 +145,7 @@ void ControlSocket::Take(Descriptor socket) {
     clients_.erase(id);
   }
   if (clients_.size() >= kMaxClients) {
-    Answer(socket.Get(), "error there are too many clients");
+    SendLine(socket.Get(), "error there are too many clients");
     return;
   }
   const std::uint64_t id = ++lastId_;
@@ -162,7 +162,7 @@ void ControlSocket::Take(Descriptor socket) {
     });
     clients_.emplace(id, Client{std::move(socket), std::move(thread)});
   } catch (const std::system_error&) {
-    Answer(number, "error there are too many threads");
+    SendLine(number, "error there are too many threads");
   }
 }
 
@@ -183,7 +183,7 @@ void ControlSocket::Serve(int socket) {
       return;
     }
     if (text.size() > kMaxLine) {
-      Answer(socket, "error the line is too long");
+      SendLine(socket, "error the line is too long");
       return;
     }
   }
@@ -193,7 +193,7 @@ bool ControlSocket::ExecuteLines(std::string& text, int socket) {
   for (std::size_t end = text.find('\n'); end != std::string::npos; end = text.find('\n')) {
     const Commands::Answer answer = commands_->Execute(text.substr(0, end));
     text.erase(0, end + 1);
-    Answer(socket, answer.line);
+    SendLine(socket, answer.line);
     if (answer.quits) {
       return false;
     }

@@ -15,12 +15,15 @@
 #include <sys/un.h>
 
 #include "commands.h"
-#include "files.h"
+#include "descriptor.h"
 
 namespace DevSts::Program {
 
 // Throws FileError if the path is too long for the address of a socket.
 sockaddr_un AddressOf(const std::string& path);
+
+// Sends the line. Ignores errors: the peer may end the connection before it has read everything.
+void SendLine(int socket, const std::string& line);
 
 // A Unix socket with which several clients at once send commands, one in a line, and receive one
 // line in answer to each. Only the owner of the process can connect.

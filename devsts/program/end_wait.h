@@ -4,8 +4,8 @@
 #include <mutex>
 #include <string>
 
+#include "descriptor.h"
 #include "event.h"
-#include "files.h"
 
 namespace DevSts::Program {
 

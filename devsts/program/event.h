@@ -1,7 +1,7 @@
 #ifndef DEVSTS_PROGRAM_EVENT_H
 #define DEVSTS_PROGRAM_EVENT_H
 
-#include "files.h"
+#include "descriptor.h"
 
 namespace DevSts::Program {
 

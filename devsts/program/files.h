@@ -3,24 +3,9 @@
 
 #include <string>
 
-#include <sys/types.h>
+#include "descriptor.h"
 
 namespace DevSts::Program {
-
-// A file descriptor that the destructor closes.
-class Descriptor {
- public:
-  Descriptor() = default;
-  explicit Descriptor(int number) : number_(number) {}
-  ~Descriptor();
-  Descriptor(Descriptor&& other) noexcept;
-  Descriptor& operator=(Descriptor&& other) noexcept;
-
-  int Get() const { return number_; }
-
- private:
-  int number_ = -1;
-};
 
 enum class Readers { Everybody, OwnerOnly };
 
@@ -59,13 +44,6 @@ class TemporaryFile {
   std::string path_;
   std::string text_;
 };
-
-// Opens /dev/null in place of each standard stream that is closed, whose number another file would
-// otherwise take.
-void OpenStandardStreams();
-
-// Writes everything, and ignores errors of a reader that has gone.
-void WriteToDescriptor(int descriptor, const std::string& text);
 
 }  // namespace DevSts::Program
 

@@ -18,7 +18,7 @@ struct Keys {
 
 // How keys are made.
 struct KeyPlan {
-  std::chrono::seconds validity = std::chrono::hours(90L * 24);
+  std::chrono::seconds validity = kCertificateLifetime;
   KeyType signingKey = KeyType::Rsa2048;
   bool signingByAuthority = false;
 };

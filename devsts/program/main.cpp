@@ -9,8 +9,8 @@
 
 #include "background.h"
 #include "control_client.h"
+#include "descriptor.h"
 #include "errors.h"
-#include "files.h"
 #include "help_texts.h"
 #include "options.h"
 #include "service_run.h"

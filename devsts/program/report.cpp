@@ -30,7 +30,8 @@ constexpr std::array<Named, 15> kCounters{{
 // The text in quotation marks. A peer must not be able to write lines or fields of its own.
 std::string QuotedField(std::string text) {
   for (char& character : text) {
-    if (character < ' ' || character == '\x7f' || character == '"') {
+    const auto octet = static_cast<unsigned char>(character);  // from 0x80 on, a part of UTF-8
+    if (octet < ' ' || octet == 0x7f || octet == '"') {
       character = '?';
     }
   }

@@ -33,7 +33,7 @@ Revocations::Revocations(Keys keys, const std::string& stateFolder) : keys_(std:
 
 void Revocations::WriteTo(const std::string& folder) {
   folders_.push_back(folder);
-  WriteWhole(folder + kFile, ListPem());
+  WriteWhole(folder + kFile, ListPem(revoked_));
 }
 
 void Revocations::Revoke(const std::string& name) {
@@ -43,11 +43,13 @@ void Revocations::Revoke(const std::string& name) {
   if (folders_.empty()) {
     throw std::invalid_argument("ca.crl has no folder; use --out or --state");
   }
-  revoked_.insert(name);
-  const std::string list = ListPem();
+  std::set<std::string> revoked = revoked_;
+  revoked.insert(name);
+  const std::string list = ListPem(revoked);
   for (const std::string& folder : folders_) {
     WriteWhole(folder + kFile, list);
   }
+  revoked_ = std::move(revoked);
 }
 
 const std::string& Revocations::CertificateOf(const std::string& name) const {
@@ -63,10 +65,10 @@ const std::string& Revocations::CertificateOf(const std::string& name) const {
   return keys_.client.certificatePem;
 }
 
-std::string Revocations::ListPem() const {
+std::string Revocations::ListPem(const std::set<std::string>& names) const {
   std::vector<std::string> certificates;
-  certificates.reserve(revoked_.size());
-  for (const std::string& name : revoked_) {
+  certificates.reserve(names.size());
+  for (const std::string& name : names) {
     certificates.push_back(CertificateOf(name));
   }
   return MakeRevocationList(keys_.authority, certificates, kListValidity);

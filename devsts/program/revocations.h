@@ -20,12 +20,13 @@ class Revocations {
   // Writes the list to this folder, now and after each change.
   void WriteTo(const std::string& folder);
   // Revokes the certificate "signing", "server" or "client". Throws std::invalid_argument for
-  // another name, a certificate that the authority has not issued, and if there is no folder.
+  // another name, a certificate that the authority has not issued, and if there is no folder; and
+  // FileError if a list cannot be written, in which case later lists do not name the certificate.
   void Revoke(const std::string& name);
 
  private:
   const std::string& CertificateOf(const std::string& name) const;
-  std::string ListPem() const;
+  std::string ListPem(const std::set<std::string>& names) const;
 
   Keys keys_;
   std::set<std::string> revoked_;

@@ -13,6 +13,7 @@
 #include "accounts_file.h"
 #include "commands.h"
 #include "control_socket.h"
+#include "descriptor.h"
 #include "end_wait.h"
 #include "errors.h"
 #include "files.h"

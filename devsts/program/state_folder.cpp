@@ -7,6 +7,7 @@
 #include <sys/file.h>
 
 #include "errors.h"
+#include "files.h"
 
 namespace DevSts::Program {
 namespace {

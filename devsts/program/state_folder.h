@@ -3,7 +3,7 @@
 
 #include <string>
 
-#include "files.h"
+#include "descriptor.h"
 #include "keys.h"
 
 namespace DevSts::Program {

@@ -3,7 +3,6 @@
 #include <iostream>
 #include <memory>
 #include <mutex>
-#include <stdexcept>
 #include <utility>
 
 #include "operations/service.h"
@@ -23,9 +22,6 @@ struct TlsIdentity {
 };
 
 namespace {
-
-// Long enough that clients do not warn that a certificate expires soon.
-constexpr std::chrono::hours kCertificateLifetime{90 * 24};
 
 bool IsGiven(const Credential& credential) {
   return !credential.certificatePem.empty();

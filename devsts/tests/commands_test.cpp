@@ -146,6 +146,14 @@ TEST_F(CommandsTest, APeerAddsNoFieldsToTheLineOfItsRequest) {
               HasSubstr(" action=\"a? status=200 b=??c\" signature=none status=500 fault=\""));
 }
 
+TEST_F(CommandsTest, ShowsFaultTextsInUtf8) {
+  const std::string text = "Fermé à 5 €";
+  EXPECT_EQ(Execute("misbehave fault=wst:RequestFailed \"fault-text=" + text + "\""),
+            "ok misbehaving");
+  EXPECT_EQ(ElementText(Ask(), "faultstring"), text);
+  EXPECT_THAT(Execute("request last"), HasSubstr(" fault=\"" + text + "\""));
+}
+
 TEST_F(CommandsTest, ShowsRequestsWithoutPasswords) {
   Ask();
   EXPECT_EQ(Execute("requests"), "ok requests=1");

@@ -172,6 +172,9 @@ std::string ProgramProcess::ReadLine() {
 }
 
 void ProgramProcess::Signal(int number) const {
+  if (process_ <= 0) {
+    throw std::logic_error("The program has ended");  // kill(-1) would signal every process
+  }
   ::kill(process_, number);
 }
 

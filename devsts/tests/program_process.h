@@ -49,6 +49,7 @@ class ProgramProcess {
   void CloseInput();
   // Reads the next line of standard output.
   std::string ReadLine();
+  // Throws after the end was waited for.
   void Signal(int number) const;
   // Reads both outputs to their ends, and returns the exit status.
   int WaitForEnd();

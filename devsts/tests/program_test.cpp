@@ -16,8 +16,8 @@
 #include <time.h>
 #include <unistd.h>
 
+#include "descriptor.h"
 #include "devsts/xml_security.h"
-#include "files.h"
 #include "help_texts.h"
 #include "program_process.h"
 #include "raw_client.h"

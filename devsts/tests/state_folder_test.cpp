@@ -52,6 +52,12 @@ class StateFolderTest : public testing::Test {
     WriteTextTo(state + "/" + name + "-key.pem", credential.privateKeyPem);
   }
 
+  // Whether the list in the folder names the certificate.
+  bool IsRevoked(const Keys& keys, const Credential& credential) const {
+    return Program::IsRevokedBy(TextOfFile(state + "/ca.crl"), credential.certificatePem,
+                                keys.authority.certificatePem);
+  }
+
   ScratchFolder scratch;
   const std::string state = scratch / "deep/state";
 };
@@ -169,22 +175,32 @@ TEST_F(StateFolderTest, RefusesASigningKeyThatTheOptionsDoNotAllow) {
 
 TEST_F(StateFolderTest, RevocationsStay) {
   const Keys keys = Start(state, ByAuthority());
-  const std::string& authority = keys.authority.certificatePem;
-  const auto isRevoked = [&](const std::string& certificate) {
-    return Program::IsRevokedBy(TextOfFile(state + "/ca.crl"), certificate, authority);
-  };
   Revocations first(keys, state);
   first.WriteTo(state);
-  EXPECT_FALSE(isRevoked(keys.signing.certificatePem));
+  EXPECT_FALSE(IsRevoked(keys, keys.signing));
   first.Revoke("signing");
-  EXPECT_TRUE(isRevoked(keys.signing.certificatePem));
-  EXPECT_FALSE(isRevoked(keys.server.certificatePem));
+  EXPECT_TRUE(IsRevoked(keys, keys.signing));
+  EXPECT_FALSE(IsRevoked(keys, keys.server));
 
   Revocations second(keys, state);
   second.WriteTo(state);
   second.Revoke("client");
-  EXPECT_TRUE(isRevoked(keys.signing.certificatePem));
-  EXPECT_TRUE(isRevoked(keys.client.certificatePem));
+  EXPECT_TRUE(IsRevoked(keys, keys.signing));
+  EXPECT_TRUE(IsRevoked(keys, keys.client));
+}
+
+TEST_F(StateFolderTest, RevokesNothingIfTheListCannotBeWritten) {
+  const Keys keys = Start(state, ByAuthority());
+  const std::string path = state + "/ca.crl";
+  Revocations revocations(keys, state);
+  revocations.WriteTo(state);
+  ASSERT_EQ(std::remove(path.c_str()), 0);
+  ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
+  EXPECT_THROW(revocations.Revoke("signing"), FileError);
+  ASSERT_EQ(std::remove(path.c_str()), 0);
+  revocations.Revoke("client");
+  EXPECT_FALSE(IsRevoked(keys, keys.signing));
+  EXPECT_TRUE(IsRevoked(keys, keys.client));
 }
 
 TEST_F(StateFolderTest, RefusesARevocationListOfAnotherAuthority) {

@@ -23,6 +23,10 @@ enum class KeyType {
   EcP384,
 };
 
+/// The validity of the certificates of a server: long enough that clients do not warn that one
+/// expires soon.
+inline constexpr std::chrono::hours kCertificateLifetime{90L * 24};
+
 /// What `MakeCertificate` puts into a certificate (RFC 5280).
 struct CertificateSpec {
   std::string commonName;

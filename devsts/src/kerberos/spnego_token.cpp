@@ -1,6 +1,5 @@
 #include "kerberos/spnego_token.h"
 
-#include <algorithm>
 #include <cstddef>
 #include <iterator>
 #include <optional>

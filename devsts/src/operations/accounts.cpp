@@ -3,18 +3,13 @@
 #include <algorithm>
 #include <utility>
 
-#include <openssl/crypto.h>
-
 #include "devsts/users.h"
+#include "operations/secrets.h"
 #include "signing/certificates.h"
 #include "soap/fault.h"
 
 namespace DevSts {
 namespace {
-
-bool Equal(const std::string& left, const std::string& right) {
-  return left.size() == right.size() && CRYPTO_memcmp(left.data(), right.data(), left.size()) == 0;
-}
 
 Users WithPlainCertificates(Users users) {
   for (auto& [name, user] : users) {
@@ -55,7 +50,7 @@ User Accounts::Authenticate(const std::string& name, const std::string& password
   const std::lock_guard lock(mutex_);
   const auto found = users_.find(name);
   if (found == users_.end() || found->second.password.empty() ||
-      !Equal(found->second.password, password)) {
+      !IsSameSecret(found->second.password, password)) {
     ThrowFailedAuthentication("Invalid credentials");
   }
   if (found->second.passwordExpired) {

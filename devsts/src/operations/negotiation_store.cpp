@@ -3,18 +3,10 @@
 #include <algorithm>
 #include <utility>
 
-#include <openssl/crypto.h>
-
+#include "operations/secrets.h"
 #include "soap/fault.h"
 
 namespace DevSts {
-namespace {
-
-bool IsSame(const std::string& left, const std::string& right) {
-  return left.size() == right.size() && CRYPTO_memcmp(left.data(), right.data(), left.size()) == 0;
-}
-
-}  // namespace
 
 NegotiationStore::Turn::Turn(NegotiationStore& store, std::string context, std::uint64_t serial,
                              std::string cookie, std::unique_ptr<PendingIssue> pending)
@@ -76,7 +68,7 @@ NegotiationStore::Turn NegotiationStore::Resume(const std::string& context,
     ThrowInvalidRequest("No negotiation is under way in the Context " + context);
   }
   Entry& entry = found->second;
-  if (!IsSame(cookie, entry.cookie)) {
+  if (!IsSameSecret(cookie, entry.cookie)) {
     ThrowInvalidRequest("The request does not have the cookie of its negotiation");
   }
   if (entry.pending == nullptr) {

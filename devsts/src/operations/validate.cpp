@@ -12,13 +12,7 @@ namespace {
 
 // What is wrong with the signature; empty if it is valid.
 std::string SignatureProblem(xmlNode* assertion, const std::string& signingPem) {
-  xmlNode* signature = nullptr;
-  for (xmlNode* child : ChildElements(assertion)) {
-    if (IsElement(child, kDsigNamespace, "Signature")) {
-      signature = child;
-      break;
-    }
-  }
+  xmlNode* signature = FirstChild(assertion, kDsigNamespace, "Signature");
   if (signature == nullptr) {
     return " has no signature";
   }

@@ -86,4 +86,8 @@ CanonicalMode CanonicalModeOf(std::string_view uri) {
   throw XmlError("unknown canonical form: " + std::string(uri));
 }
 
+bool IsExclusive(CanonicalMode mode) {
+  return mode == CanonicalMode::Exclusive || mode == CanonicalMode::ExclusiveWithComments;
+}
+
 }  // namespace DevSts

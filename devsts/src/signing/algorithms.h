@@ -18,6 +18,9 @@ const char* PssDigestOf(std::string_view signatureUri);
 // The canonical form that an identifier names. Throws XmlError for an unknown one.
 CanonicalMode CanonicalModeOf(std::string_view uri);
 
+// Whether the form is one of Exclusive XML Canonicalization.
+bool IsExclusive(CanonicalMode mode);
+
 }  // namespace DevSts
 
 #endif

@@ -5,6 +5,7 @@
 #include <libxml/c14n.h>
 #include <libxml/xpath.h>
 
+#include "signing/algorithms.h"
 #include "signing/openssl_handles.h"
 #include "xml/document.h"
 
@@ -13,10 +14,6 @@ namespace {
 
 using XPathContextHandle = std::unique_ptr<xmlXPathContext, FreeWith<xmlXPathFreeContext>>;
 using XPathObjectHandle = std::unique_ptr<xmlXPathObject, FreeWith<xmlXPathFreeObject>>;
-
-bool IsExclusive(CanonicalMode mode) {
-  return mode == CanonicalMode::Exclusive || mode == CanonicalMode::ExclusiveWithComments;
-}
 
 bool KeepsComments(CanonicalMode mode) {
   return mode == CanonicalMode::InclusiveWithComments ||

@@ -35,9 +35,7 @@ class TemplateWriter {
 
 // Exclusive XML Canonicalization 1.0, section 4; the inclusive forms have no prefix list.
 void AddInclusiveNamespaces(xmlNode* transform, const SignOptions& options) {
-  const bool exclusive = options.canonicalization == CanonicalMode::Exclusive ||
-                         options.canonicalization == CanonicalMode::ExclusiveWithComments;
-  if (!exclusive || options.inclusivePrefixes.empty()) {
+  if (!IsExclusive(options.canonicalization) || options.inclusivePrefixes.empty()) {
     return;
   }
   std::string list;

@@ -9,7 +9,6 @@ namespace {
 constexpr char kUpnFormat[] = "http://schemas.xmlsoap.org/claims/UPN";
 constexpr char kEntityFormat[] = "urn:oasis:names:tc:SAML:2.0:nameid-format:entity";
 constexpr char kBearerMethod[] = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
-constexpr char kHolderOfKeyMethod[] = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 constexpr char kUriNameFormat[] = "urn:oasis:names:tc:SAML:2.0:attrname-format:uri";
 constexpr char kClaims[] = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/";
 

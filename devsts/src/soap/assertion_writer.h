@@ -11,6 +11,9 @@
 
 namespace DevSts {
 
+// The Method of the SubjectConfirmation of a holder-of-key token (SAML 2.0 Profiles, section 3.1).
+inline constexpr char kHolderOfKeyMethod[] = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
+
 struct DelegateEntry {
   std::string name;
   Time instant;

@@ -86,12 +86,7 @@ xmlNode* OnlyChild(const xmlNode* parent, const char* namespaceUri, const char* 
 }
 
 xmlNode* KeyInfoOf(const xmlNode* signature) {
-  for (xmlNode* child : ChildElements(signature)) {
-    if (IsElement(child, kDsigNamespace, "KeyInfo")) {
-      return child;
-    }
-  }
-  return nullptr;
+  return FirstChild(signature, kDsigNamespace, "KeyInfo");
 }
 
 }  // namespace

@@ -11,8 +11,6 @@
 namespace DevSts {
 namespace {
 
-constexpr char kHolderOfKey[] = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
-
 // Reads one assertion. Every fault names it.
 class TokenReader {
  public:
@@ -35,7 +33,7 @@ class TokenReader {
     return token;
   }
 
-  bool IsHolderOfKey() const { return AttributeOf(Confirmation(), "Method") == kHolderOfKey; }
+  bool IsHolderOfKey() const { return AttributeOf(Confirmation(), "Method") == kHolderOfKeyMethod; }
 
   std::string HolderCertificate() const {
     const xmlNode* data = Child(Confirmation(), kSamlNamespace, "SubjectConfirmationData");
@@ -52,12 +50,11 @@ class TokenReader {
 
  private:
   xmlNode* Child(const xmlNode* parent, const char* namespaceUri, const char* localName) const {
-    for (xmlNode* child : ChildElements(parent)) {
-      if (IsElement(child, namespaceUri, localName)) {
-        return child;
-      }
+    xmlNode* child = FirstChild(parent, namespaceUri, localName);
+    if (child == nullptr) {
+      ThrowInvalidSecurityToken(place_ + " has no " + localName);
     }
-    ThrowInvalidSecurityToken(place_ + " has no " + localName);
+    return child;
   }
 
   xmlNode* Subject() const { return Child(assertion_, kSamlNamespace, "Subject"); }

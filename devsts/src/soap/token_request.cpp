@@ -45,9 +45,9 @@ std::string ReadDelegateTo(xmlNode* element) {
   return name;
 }
 
-xmlNode* ReadActAs(xmlNode* element) {
-  RequireAttributes(element, {});
-  ElementReader reader(element);
+xmlNode* OnlyAssertionIn(xmlNode* target) {
+  RequireAttributes(target, {});
+  ElementReader reader(target);
   xmlNode* assertion = reader.Expect(kSamlNamespace, "Assertion");
   reader.End();
   return assertion;
@@ -137,7 +137,7 @@ void ReadOptionalParts(ElementReader& reader, const std::string& vendorHost,
     request.delegateTo = ReadDelegateTo(delegateTo);
   }
   if (xmlNode* actAs = reader.Optional(kTrust14Namespace, "ActAs")) {
-    request.actAs = ReadActAs(actAs);
+    request.actAs = OnlyAssertionIn(actAs);
   }
   if (xmlNode* participants = reader.Optional(kTrustNamespace, "Participants")) {
     request.audiences = ReadParticipants(participants);
@@ -151,14 +151,6 @@ void ReadOptionalParts(ElementReader& reader, const std::string& vendorHost,
     ReadUseKey(useKey);
     request.usesKey = true;
   }
-}
-
-xmlNode* OnlyAssertionIn(xmlNode* target) {
-  RequireAttributes(target, {});
-  ElementReader reader(target);
-  xmlNode* assertion = reader.Expect(kSamlNamespace, "Assertion");
-  reader.End();
-  return assertion;
 }
 
 }  // namespace

@@ -1,7 +1,6 @@
 #ifndef DEVSTS_WIRE_CONNECTION_H
 #define DEVSTS_WIRE_CONNECTION_H
 
-#include <atomic>
 #include <chrono>
 #include <cstddef>
 #include <optional>

@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <ctime>
-#include <utility>
 
 namespace DevSts {
 

@@ -6,13 +6,11 @@ namespace DevSts {
 namespace {
 
 constexpr std::chrono::hours kDay{24};
-// Long enough that clients do not warn that it ends soon.
-constexpr std::chrono::hours kLifetime = 90 * kDay;
 
 Credential MakeIntermediate(const Credential& authority) {
   CertificateSpec spec;
   spec.commonName = "Dev STS intermediate CA";
-  spec.notAfter = kLifetime;
+  spec.notAfter = kCertificateLifetime;
   spec.isAuthority = true;
   return MakeCertificate(spec, &authority);
 }
@@ -20,7 +18,7 @@ Credential MakeIntermediate(const Credential& authority) {
 CertificateSpec SpecFor(const TlsOptions& options) {
   CertificateSpec spec;
   spec.commonName = "Dev STS server";
-  spec.notAfter = kLifetime;
+  spec.notAfter = kCertificateLifetime;
   spec.dnsNames = {"localhost"};
   spec.addresses = {"127.0.0.1", "::1"};
   switch (options.certificate) {

@@ -159,6 +159,16 @@ std::vector<xmlNode*> ChildElements(const xmlNode* element) {
   return children;
 }
 
+xmlNode* FirstChild(const xmlNode* parent, std::string_view namespaceUri,
+                    std::string_view localName) {
+  for (xmlNode* child : ChildElements(parent)) {
+    if (IsElement(child, namespaceUri, localName)) {
+      return child;
+    }
+  }
+  return nullptr;
+}
+
 namespace {
 
 xmlNode* NextNode(const xmlNode* root, xmlNode* node) {
