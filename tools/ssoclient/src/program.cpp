@@ -12,7 +12,7 @@
 #include <CLI/CLI.hpp>
 #include <nlohmann/json.hpp>
 
-#include "commands/command.h"
+#include "commands/commands.h"
 #include "failure.h"
 #include "help/help_formatter.h"
 #include "output/safe_text.h"

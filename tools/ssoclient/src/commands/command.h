@@ -48,9 +48,6 @@ class Command {
   bool wantsJson_ = false;
 };
 
-/// All commands, in the order of the help.
-std::vector<std::unique_ptr<Command>> MakeCommands();
-
 }  // namespace SsoClient::Tool
 
 #endif

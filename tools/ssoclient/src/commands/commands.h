@@ -2,6 +2,7 @@
 #define SSOCLIENT_TOOL_COMMANDS_COMMANDS_H
 
 #include <memory>
+#include <vector>
 
 #include "commands/command.h"
 
@@ -14,6 +15,9 @@ std::unique_ptr<Command> MakeExchangeCommand();
 std::unique_ptr<Command> MakeShowCommand();
 std::unique_ptr<Command> MakeVerifyCommand();
 std::unique_ptr<Command> MakeDoctorCommand();
+
+/// All commands, in the order of the help.
+std::vector<std::unique_ptr<Command>> MakeCommands();
 
 }  // namespace SsoClient::Tool
 

@@ -39,9 +39,10 @@ TEST(HelpFormatterTest, TheHelpOfTheProgramSaysItsExitStatus) {
   EXPECT_EQ(help.status, 0);
   EXPECT_EQ(help.err, "");
   ExpectGoodLines(help.out);
-  for (const char* text : {"Usage: ssoclient COMMAND [OPTION]...\n", "\n  show ", "\n  verify ",
-                           "\nExit status:\n  0  done", "\n  1  the service refused",
-                           "\n  2  the command line", "\n  3  no usable answer", "\n  4  a local problem"}) {
+  for (const char* text :
+       {"Usage: ssoclient COMMAND [OPTION]...\n", "\n  show ", "\n  verify ",
+        "\nExit status:\n  0  done", "\n  1  the service refused", "\n  2  the command line",
+        "\n  3  no usable answer", "\n  4  a local problem"}) {
     EXPECT_NE(help.out.find(text), std::string::npos) << text << help.out;
   }
 }
