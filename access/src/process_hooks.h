@@ -11,7 +11,7 @@ class Core;
 /// Differs between a process and its forked children.
 std::uint64_t ForkGeneration() noexcept;
 
-/// From now on, `core` is told when the process ends, if `WatchProcessEnd` has been called.
+/// From now on, `core` is notified when the process ends, if `WatchProcessEnd` has been called.
 void RegisterCore(const std::shared_ptr<Core>& core);
 
 /// Registers a handler for the end of the process, once. It must run before that of the thread

@@ -181,7 +181,7 @@ void TrustWatch::Replace(std::shared_ptr<const Trust> trust) {
   reported_ = {};
   reportedFailure_.clear();
   if (isNews) {
-    Tell(record);
+    Report(record);
   }
 }
 
@@ -196,10 +196,10 @@ void TrustWatch::Keep(const TrustListing& listing, const std::string& failure) {
   record.failure = failure;
   reported_ = listing;
   reportedFailure_ = failure;
-  Tell(record);
+  Report(record);
 }
 
-void TrustWatch::Tell(const TrustRecord& record) noexcept {
+void TrustWatch::Report(const TrustRecord& record) noexcept {
   TrustListener* const listener = parts_->config.listener.get();
   if (listener == nullptr || isStopped_) {
     return;

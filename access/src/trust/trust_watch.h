@@ -66,7 +66,7 @@ class TrustWatch : public std::enable_shared_from_this<TrustWatch> {
   void ReadAll(TrustListing& listing);
   void Replace(std::shared_ptr<const Trust> trust);
   void Keep(const TrustListing& listing, const std::string& failure);
-  void Tell(const TrustRecord& record) noexcept;
+  void Report(const TrustRecord& record) noexcept;
 
   const std::shared_ptr<TrustParts> parts_;
   Activity activity_;
