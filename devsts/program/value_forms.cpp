@@ -107,6 +107,19 @@ std::pair<std::string, std::string> HalvesFrom(const std::string& text) {
                                     : std::pair(text.substr(0, slash), text.substr(slash + 1));
 }
 
+std::string ShellWord(const std::string& value) {
+  constexpr const char* kPlain =
+      "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789_./:@%+=,[]-";
+  if (value.find_first_not_of(kPlain) == std::string::npos) {
+    return value;
+  }
+  std::string word = "'";
+  for (const char c : value) {
+    word += c == '\'' ? "'\\''" : std::string(1, c);
+  }
+  return word + "'";
+}
+
 void Substitution::operator()(std::string& text) const {
   for (std::size_t at = text.find(from); at != std::string::npos;
        at = text.find(from, at + to.size())) {

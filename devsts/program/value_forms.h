@@ -31,6 +31,9 @@ std::vector<std::string> ListFrom(const std::string& text);
 // "FIRST" or "FIRST/SECOND"; the second text is empty if it is missing.
 std::pair<std::string, std::string> HalvesFrom(const std::string& text);
 
+// The value as a shell reads it back: in single quotes, unless it is one word without them.
+std::string ShellWord(const std::string& value);
+
 // Replaces each occurrence of a text.
 struct Substitution {
   std::string from;

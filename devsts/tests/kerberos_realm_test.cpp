@@ -136,5 +136,20 @@ TEST(KerberosRealmTest, NamesAProgramThatIsNotInstalled) {
                         "krb5-admin-server and krb5-user\n"));
 }
 
+TEST(KerberosRealmTest, MayBeInAFolderWithABlank) {
+  const ScratchFolder scratch;
+  const std::string folder = scratch / "it's \"a\" blank";
+  ASSERT_TRUE(std::filesystem::create_directory(folder));
+  const ReplacedVariable temporary("TMPDIR", folder);
+  ProgramProcess program(
+      {"--realm", "--ready-file", scratch / "ready", "--user-keytabs", scratch / "keytabs"});
+  program.AwaitReady();
+  EXPECT_TRUE(FileExists(scratch / "keytabs/alice.keytab"));
+  // A shell reads the lines and finds the ticket of the first user.
+  const std::string lines = ". " + (scratch / "ready") + " && export KRB5_CONFIG=\"$krb5_config\" ";
+  EXPECT_EQ(std::system((lines + "&& klist -s -c \"$krb5_cache\"").c_str()), 0);
+  EXPECT_EQ(std::system((lines + "&& test \"$service\" = HTTP@localhost").c_str()), 0);
+}
+
 }  // namespace
 }  // namespace DevSts::Testing
