@@ -180,6 +180,8 @@ Vocabulary<Misbehavior> FormNames() {
        [](Value value, Misbehavior& target) { target.extraHeaders.push_back(HeaderFrom(value)); }},
       {"cookie", "TEXT", "adds a Set-Cookie field; may be repeated",
        [](Value value, Misbehavior& target) { target.setCookies.push_back(OctetsFrom(value)); }},
+      {"clock", "OFFSET", "the clock of the service is wrong by this, such as +10m or -90s",
+       [](Value value, Misbehavior& target) { target.clockOffset = OffsetFrom(value); }},
       {"without-date", "", "sends no Date",
        [](Value, Misbehavior& target) { target.omitDate = true; }},
       {"pad-headers", "OCTETS", "adds header fields of about this size",

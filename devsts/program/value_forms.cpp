@@ -56,6 +56,15 @@ std::chrono::milliseconds TimeFrom(const std::string& text) {
   ThrowNot("a time such as 500ms, 2s, 5m, 1h or 30d", text);
 }
 
+std::chrono::milliseconds OffsetFrom(const std::string& text) {
+  const char sign = text.empty() ? '\0' : text[0];
+  if (sign != '+' && sign != '-') {
+    ThrowNot("a sign and a time, such as +10m or -90s", text);
+  }
+  const std::chrono::milliseconds time = TimeFrom(text.substr(1));
+  return sign == '-' ? -time : time;
+}
+
 std::string OctetsFrom(const std::string& text) {
   constexpr std::array<std::pair<char, char>, 4> kEscapes{
       {{'r', '\r'}, {'n', '\n'}, {'t', '\t'}, {'\\', '\\'}}};

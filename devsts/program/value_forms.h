@@ -22,6 +22,8 @@ std::uint64_t NumberFrom(const std::string& text,
 bool FlagFrom(const std::string& text);
 // A number and a unit: ms, s, m, h or d.
 std::chrono::milliseconds TimeFrom(const std::string& text);
+// A sign and a time.
+std::chrono::milliseconds OffsetFrom(const std::string& text);
 // A text with the escapes \r, \n, \t, \\ and \xHH.
 std::string OctetsFrom(const std::string& text);
 // "NAME: VALUE".
