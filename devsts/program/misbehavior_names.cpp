@@ -126,7 +126,7 @@ using Value = const std::string&;
 
 Vocabulary<Misbehavior> AnswerNames() {
   return {
-      {"fault", "CODE", "answers with a SOAP fault, CODE being such as wst:RequestFailed",
+      {"fault", "CODE", "answers with a SOAP fault; see CODE above",
        [](Value value, Misbehavior& target) { SetFaultCode(value, FaultOf(target)); }},
       {"fault-text", "TEXT", "the faultstring of the fault",
        [](Value value, Misbehavior& target) { FaultOf(target).faultString = OctetsFrom(value); }},
