@@ -82,6 +82,14 @@ TEST_F(CommandsTest, StallsAndResumes) {
   EXPECT_THAT(Ask(), StartsWith("HTTP/1.1 200 "));
 }
 
+TEST_F(CommandsTest, ResumingLeavesTheMisbehaviourOfTheNextRequests) {
+  EXPECT_EQ(Execute("misbehave http-status=503"), "ok misbehaving");
+  EXPECT_EQ(Execute("misbehave next 1 http-status=429"), "ok misbehaving next 1");
+  EXPECT_EQ(Execute("resume"), "ok resumed");
+  EXPECT_THAT(Ask(), StartsWith("HTTP/1.1 429 "));
+  EXPECT_THAT(Ask(), StartsWith("HTTP/1.1 200 "));
+}
+
 TEST_F(CommandsTest, RevokesTokens) {
   const std::string assertion = AssertionIn(Ask());
   const std::size_t begin = assertion.find(" ID=\"") + 5;

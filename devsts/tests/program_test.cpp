@@ -423,6 +423,8 @@ TEST(ProgramTest, HelpBeginsWithAnExample) {
   EXPECT_EQ(help.status, 0);
   EXPECT_THAT(help.output, StartsWith("Example:\n  ssoclient-devsts --background "));
   EXPECT_THAT(help.output, HasSubstr("FOR TESTS ONLY"));
+  EXPECT_THAT(help.output, HasSubstr("\nUsage: ssoclient-devsts [OPTIONS]\n"
+                                     "  or:  ssoclient-devsts control PATH COMMAND...\n"));
   EXPECT_EQ(RunProgram({"--help-misbehaviour"}).output, Program::MisbehaviorHelp());
   EXPECT_EQ(RunProgram({"control", "--help"}).output, Program::ControlHelp());
   EXPECT_EQ(RunProgram({"--help-control"}).output, Program::ControlHelp());
