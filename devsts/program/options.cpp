@@ -34,7 +34,7 @@ struct NamedOptions {
 class BothUsages : public CLI::Formatter {
  public:
   std::string make_usage(const CLI::App* /*app*/, std::string /*name*/) const override {
-    return "Usage: ssoclient-devsts [OPTIONS]\n  or:  ssoclient-devsts control PATH COMMAND...\n\n";
+    return "Usage: ssoclient-devsts [OPTIONS]\n  or:  ssoclient-devsts control PATH COMMAND...\n";
   }
 };
 
