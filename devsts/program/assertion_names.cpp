@@ -4,6 +4,7 @@
 #include <string>
 #include <utility>
 
+#include "fault_names.h"
 #include "value_forms.h"
 
 namespace DevSts::Program {
@@ -170,6 +171,16 @@ const Vocabulary<NegotiationScript>& NegotiationNames() {
        [](Value value, NegotiationScript& target) { target.moreLegs = CountFrom(value); }},
       {"fail-at-leg", "N", "answers this leg with the fault wst:FailedAuthentication",
        [](Value value, NegotiationScript& target) { target.failAtLeg = CountFrom(value); }},
+      {"leg-fault", "CODE", "another code for the fault of fail-at-leg",
+       [](Value value, NegotiationScript& target) { SetFaultCode(value, target.failure); }},
+      {"leg-fault-text", "TEXT", "the faultstring of the fault of fail-at-leg",
+       [](Value value, NegotiationScript& target) {
+         target.failure.faultString = OctetsFrom(value);
+       }},
+      {"leg-fault-status", "N", "the HTTP status of the fault of fail-at-leg (500)",
+       [](Value value, NegotiationScript& target) {
+         target.failure.httpStatus = HttpStatusFrom(value);
+       }},
   };
   return names;
 }

@@ -41,7 +41,7 @@ const std::vector<Commands::Command>& Commands::All() {
       {"clear", "", "ends all misbehaviour", 0, 0, &Commands::ClearMisbehavior},
       {"stall", "", "reads requests and never answers, like misbehave stall=before-answer", 0, 0,
        &Commands::Stall},
-      {"resume", "", "ends the misbehaviour, except for the next N requests", 0, 0,
+      {"resume", "", "ends what misbehave and stall have started; misbehave next N stays", 0, 0,
        &Commands::Resume},
       {"tls", "[NAME[=VALUE]...]", "replaces what --tls has set, for new connections", 0,
        kAnyNumber, &Commands::SetTls},

@@ -46,7 +46,11 @@ std::string HelpAfterOptions() {
 std::string MisbehaviorHelp() {
   return "--misbehave NAME[=VALUE], and the command misbehave. Names can be combined. TEXT has "
          "the\n"
-         "escapes \\r, \\n, \\t, \\\\ and \\xHH; TIME is such as 500ms, 2s, 5m, 1h or 30d.\n" +
+         "escapes \\r, \\n, \\t, \\\\ and \\xHH; TIME is such as 500ms, 2s, 5m, 1h or 30d.\n"
+         "CODE is PREFIX:NAME with the prefix soap, wst, wsse or wsu, such as wst:RequestFailed;\n"
+         "{NAMESPACE}NAME; or NAME, which is in no namespace. /FROM/TO/ may have another "
+         "character\n"
+         "in place of the slash, such as |FROM|TO|.\n" +
          Describe(MisbehaviorNames()) +
          "\n--tls NAME[=VALUE], and the command tls. One kind of certificate, one range of "
          "protocols:\n" +

@@ -1,11 +1,11 @@
 #include "misbehavior_names.h"
 
-#include <array>
 #include <cstddef>
 #include <map>
 #include <string>
 #include <utility>
 
+#include "fault_names.h"
 #include "value_forms.h"
 
 namespace DevSts::Program {
@@ -13,39 +13,11 @@ namespace {
 
 constexpr std::size_t kMaxPadding = std::size_t{1} << 30U;
 
-constexpr std::array<std::pair<const char*, const char*>, 4> kPrefixes{{
-    {"soap", "http://schemas.xmlsoap.org/soap/envelope/"},
-    {"wst", "http://docs.oasis-open.org/ws-sx/ws-trust/200512"},
-    {"wsse", "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd"},
-    {"wsu", "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd"},
-}};
-
-void SetCode(const std::string& text, FaultAnswer& fault) {
-  const bool hasNamespace = text.rfind('{', 0) == 0;
-  const std::size_t colon = hasNamespace ? text.rfind('}') : text.find(':');
-  fault.codeNamespace.clear();
-  fault.codeName = colon == std::string::npos ? text : text.substr(colon + 1);
-  if (hasNamespace && colon != std::string::npos) {
-    fault.codeNamespace = text.substr(1, colon - 1);
-  } else if (colon != std::string::npos) {
-    for (const auto& [prefix, uri] : kPrefixes) {
-      if (text.substr(0, colon) == prefix) {
-        fault.codeNamespace = uri;
-      }
-    }
-  }
-  if (fault.codeName.empty() || fault.codeName[0] == '{' ||
-      (colon != std::string::npos && fault.codeNamespace.empty())) {
-    throw std::invalid_argument("'" + text +
-                                "' is not PREFIX:NAME with the prefix soap, wst, wsse or wsu, "
-                                "{NAMESPACE}NAME or NAME");
-  }
-}
-
 FaultAnswer& FaultOf(Misbehavior& target) {
   if (!target.fault) {
-    target.fault = FaultAnswer{kPrefixes[1].second, "RequestFailed",
-                               "The service is configured to fail", false, 500};
+    target.fault = FaultAnswer{};
+    SetFaultCode("wst:RequestFailed", *target.fault);
+    target.fault->faultString = "The service is configured to fail";
   }
   return *target.fault;
 }
@@ -82,14 +54,6 @@ std::string ReasonOf(int status) {
   };
   const auto reason = kReasons.find(status);
   return reason != kReasons.end() ? reason->second : "";
-}
-
-int StatusFrom(const std::string& value) {
-  const auto status = static_cast<int>(NumberFrom(value, 999));
-  if (status < 100) {
-    throw std::invalid_argument("'" + value + "' is not a status of HTTP");
-  }
-  return status;
 }
 
 // Keeps a reason that was given before the status.
@@ -162,16 +126,20 @@ using Value = const std::string&;
 
 Vocabulary<Misbehavior> AnswerNames() {
   return {
-      {"fault", "CODE", "answers with a SOAP fault, CODE being such as wst:RequestFailed",
-       [](Value value, Misbehavior& target) { SetCode(value, FaultOf(target)); }},
+      {"fault", "CODE", "answers with a SOAP fault; see CODE above",
+       [](Value value, Misbehavior& target) { SetFaultCode(value, FaultOf(target)); }},
       {"fault-text", "TEXT", "the faultstring of the fault",
        [](Value value, Misbehavior& target) { FaultOf(target).faultString = OctetsFrom(value); }},
       {"fault-without-text", "", "the fault has no faultstring",
        [](Value, Misbehavior& target) { FaultOf(target).omitFaultString = true; }},
       {"fault-status", "N", "the HTTP status of the fault (500)",
-       [](Value value, Misbehavior& target) { FaultOf(target).httpStatus = StatusFrom(value); }},
+       [](Value value, Misbehavior& target) {
+         FaultOf(target).httpStatus = HttpStatusFrom(value);
+       }},
       {"http-status", "N", "answers over HTTP with this status and without SOAP",
-       [](Value value, Misbehavior& target) { SetHttpStatus(StatusFrom(value), HttpOf(target)); }},
+       [](Value value, Misbehavior& target) {
+         SetHttpStatus(HttpStatusFrom(value), HttpOf(target));
+       }},
       {"http-reason", "TEXT", "another reason phrase for that status",
        [](Value value, Misbehavior& target) { HttpOf(target).reason = OctetsFrom(value); }},
       {"http-header", "NAME: VALUE", "a header field of that answer; may be repeated",
@@ -212,6 +180,8 @@ Vocabulary<Misbehavior> FormNames() {
        [](Value value, Misbehavior& target) { target.extraHeaders.push_back(HeaderFrom(value)); }},
       {"cookie", "TEXT", "adds a Set-Cookie field; may be repeated",
        [](Value value, Misbehavior& target) { target.setCookies.push_back(OctetsFrom(value)); }},
+      {"clock", "OFFSET", "the clock of the service is wrong by this, such as +10m or -90s",
+       [](Value value, Misbehavior& target) { target.clockOffset = OffsetFrom(value); }},
       {"without-date", "", "sends no Date",
        [](Value, Misbehavior& target) { target.omitDate = true; }},
       {"pad-headers", "OCTETS", "adds header fields of about this size",

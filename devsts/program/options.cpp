@@ -3,6 +3,7 @@
 #include <array>
 #include <functional>
 #include <iostream>
+#include <memory>
 #include <stdexcept>
 
 #include <CLI/CLI.hpp>
@@ -27,6 +28,14 @@ struct NamedOptions {
   Texts negotiation;
   bool requestsMic = false;
   bool resumesNothing = false;
+};
+
+// The help, with both forms of the command.
+class BothUsages : public CLI::Formatter {
+ public:
+  std::string make_usage(const CLI::App* /*app*/, std::string /*name*/) const override {
+    return "Usage: ssoclient-devsts [OPTIONS]\n  or:  ssoclient-devsts control PATH COMMAND...\n";
+  }
 };
 
 // What a script writes for a variable that is not set.
@@ -71,9 +80,9 @@ void AddListening(CLI::App& app, Options& options) {
 void AddFiles(CLI::App& app, Options& options) {
   constexpr const char* kGroup = "Keys and certificates";
   AddText(app, "--state", options.stateFolder, "DIR",
-          "Folder that keeps the keys: made at the first start, used at the later ones", kGroup);
+          "Folder that keeps the keys: created at the first start and reused later", kGroup);
   AddText(app, "--out", options.outFolder, "DIR",
-          "Folder that receives ca.pem, signing.pem, client.pem and client-key.pem", kGroup);
+          "Folder to write ca.pem, signing.pem, client.pem and client-key.pem to", kGroup);
   app.add_flag("--signing-by-ca", options.signingByAuthority,
                "The CA issues the signing certificate, and ca.crl is written beside ca.pem")
       ->group(kGroup);
@@ -138,7 +147,7 @@ void AddRunning(CLI::App& app, Options& options) {
                     ->option_text(" ")
                     ->group(kGroup);
   AddText(app, "--log", options.logFile, "FILE",
-          "Appends the lines of requests to this file, which is no symbolic link", kGroup)
+          "Appends the lines of requests to this file, which must not be a symbolic link", kGroup)
       ->excludes(quiet);
 }
 
@@ -212,8 +221,10 @@ std::optional<Options> ParseOptions(int argc, char** argv) {
   bool wantsVersion = false;
 
   CLI::App app(HelpBeforeOptions(), "ssoclient-devsts");
+  app.formatter(std::make_shared<BothUsages>());
   app.get_formatter()->column_width(32);
   app.footer(HelpAfterOptions());
+  app.set_help_flag("-h,--help", "Prints this help and ends");
   AddListening(app, options);
   AddFiles(app, options);
   AddUserOptions(app, options);

@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include "files.h"
+#include "value_forms.h"
 
 namespace DevSts::Program {
 
@@ -42,11 +43,11 @@ void StartedRealm::AddUsers(const AccountsFile& accounts) {
 }
 
 std::string StartedRealm::Lines() const {
-  std::string lines = "krb5_config=" + realm_.ConfigPath() + "\n";
+  std::string lines = "krb5_config=" + ShellWord(realm_.ConfigPath()) + "\n";
   if (!cache_.empty()) {
-    lines += "krb5_cache=" + cache_ + "\n";
+    lines += "krb5_cache=" + ShellWord(cache_) + "\n";
   }
-  return lines + "service=" + service_ + "\n";
+  return lines + "service=" + ShellWord(service_) + "\n";
 }
 
 }  // namespace DevSts::Program

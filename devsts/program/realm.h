@@ -18,7 +18,7 @@ class StartedRealm {
 
   // The keytab of the service.
   const std::string& Keytab() const { return keytab_; }
-  // The lines that a client needs to log in.
+  // The lines that a client needs to log in, which a shell can read.
   std::string Lines() const;
 
  private:

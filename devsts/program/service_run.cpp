@@ -93,20 +93,30 @@ Users UsersOf(const AccountsFile& accounts, const Keys& keys) {
   return users;
 }
 
-std::unique_ptr<Server> StartServer(ServerOptions options) {
+// What cannot be opened: the address, if the system does not have it, or a port.
+std::string DescribePort(const PortError& error, const ServerOptions& options) {
+  const std::string reason = " cannot be opened: " + error.code().message();
+  if (error.code() == std::errc::address_not_available) {
+    return "--address " + options.address + reason;
+  }
+  return error.IsOverTls() ? "--https-port " + std::to_string(options.httpsPort) + reason
+                           : "--http-port " + std::to_string(options.httpPort) + reason;
+}
+
+std::unique_ptr<Server> StartServer(const ServerOptions& options) {
   if (!options.negotiation.keytab.empty() &&
       access(options.negotiation.keytab.c_str(), R_OK) != 0) {
     throw FileError(options.negotiation.keytab + ": the keytab cannot be read");
   }
   try {
-    return std::make_unique<Server>(std::move(options));
-  } catch (const std::system_error& error) {
+    return std::make_unique<Server>(options);
+  } catch (const PortError& error) {
     const std::error_code code = error.code();
     if (code != std::errc::address_in_use && code != std::errc::address_not_available &&
         code != std::errc::permission_denied) {
       throw;
     }
-    throw ProgramError(ExitStatus::Port, std::string("a port cannot be opened: ") + error.what());
+    throw ProgramError(ExitStatus::Port, DescribePort(error, options));
   }
 }
 
@@ -220,13 +230,13 @@ class Service {
       };
     }
     serverOptions.onFailure = [this](const std::string& message) { end_.Fail(message); };
-    const Users users = serverOptions.users;
-    server_ = StartServer(std::move(serverOptions));
+    server_ = StartServer(serverOptions);
     server_->SetNegotiationScript(options_.negotiation);
     if (options_.misbehaves) {
       server_->SetMisbehavior(options_.misbehavior);
     }
-    commands_.emplace(*server_, users, options_.server.assertion, std::move(revocations));
+    commands_.emplace(*server_, serverOptions.users, options_.server.assertion,
+                      std::move(revocations));
   }
 
   // In the order in which they are made.

@@ -56,6 +56,15 @@ std::chrono::milliseconds TimeFrom(const std::string& text) {
   ThrowNot("a time such as 500ms, 2s, 5m, 1h or 30d", text);
 }
 
+std::chrono::milliseconds OffsetFrom(const std::string& text) {
+  const char sign = text.empty() ? '\0' : text[0];
+  if (sign != '+' && sign != '-') {
+    ThrowNot("a sign and a time, such as +10m or -90s", text);
+  }
+  const std::chrono::milliseconds time = TimeFrom(text.substr(1));
+  return sign == '-' ? -time : time;
+}
+
 std::string OctetsFrom(const std::string& text) {
   constexpr std::array<std::pair<char, char>, 4> kEscapes{
       {{'r', '\r'}, {'n', '\n'}, {'t', '\t'}, {'\\', '\\'}}};
@@ -105,6 +114,19 @@ std::pair<std::string, std::string> HalvesFrom(const std::string& text) {
   const std::size_t slash = text.find('/');
   return slash == std::string::npos ? std::pair(text, std::string())
                                     : std::pair(text.substr(0, slash), text.substr(slash + 1));
+}
+
+std::string ShellWord(const std::string& value) {
+  constexpr const char* kPlain =
+      "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789_./:@%+=,[]-";
+  if (value.find_first_not_of(kPlain) == std::string::npos) {
+    return value;
+  }
+  std::string word = "'";
+  for (const char c : value) {
+    word += c == '\'' ? "'\\''" : std::string(1, c);
+  }
+  return word + "'";
 }
 
 void Substitution::operator()(std::string& text) const {

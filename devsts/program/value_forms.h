@@ -22,6 +22,8 @@ std::uint64_t NumberFrom(const std::string& text,
 bool FlagFrom(const std::string& text);
 // A number and a unit: ms, s, m, h or d.
 std::chrono::milliseconds TimeFrom(const std::string& text);
+// A sign and a time.
+std::chrono::milliseconds OffsetFrom(const std::string& text);
 // A text with the escapes \r, \n, \t, \\ and \xHH.
 std::string OctetsFrom(const std::string& text);
 // "NAME: VALUE".
@@ -30,6 +32,9 @@ std::pair<std::string, std::string> HeaderFrom(const std::string& text);
 std::vector<std::string> ListFrom(const std::string& text);
 // "FIRST" or "FIRST/SECOND"; the second text is empty if it is missing.
 std::pair<std::string, std::string> HalvesFrom(const std::string& text);
+
+// The value as a shell reads it back: in single quotes, unless it is one word without them.
+std::string ShellWord(const std::string& value);
 
 // Replaces each occurrence of a text.
 struct Substitution {

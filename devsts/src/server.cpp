@@ -85,15 +85,21 @@ class Server::Impl {
         tls(MakeTlsIdentity(options.tls, options.keys, authority)),
         service(options, signing),
         observation(options.requestLogLimit),
-        httpListener(
-            options.address, options.httpPort, [this](int socket) { Take(socket, nullptr); },
-            [this](const std::string& message) { Report(message); }),
-        httpsListener(
-            options.address, options.httpsPort,
-            [this](int socket) { Take(socket, Tls().context.get()); },
-            [this](const std::string& message) { Report(message); }) {}
+        httpListener(Open(false)),
+        httpsListener(Open(true)) {}
 
   ~Impl() { threads.Stop(); }
+
+  Listener Open(bool overTls) {
+    try {
+      return Listener(
+          options.address, overTls ? options.httpsPort : options.httpPort,
+          [this, overTls](int socket) { Take(socket, overTls ? Tls().context.get() : nullptr); },
+          [this](const std::string& message) { Report(message); });
+    } catch (const std::system_error& error) {
+      throw PortError(error.code(), overTls);
+    }
+  }
 
   TlsIdentity Tls() const {
     const std::lock_guard lock(tlsMutex);

@@ -2,6 +2,7 @@
 
 #include <cctype>
 #include <chrono>
+#include <ctime>
 #include <memory>
 #include <stdexcept>
 #include <string>
@@ -78,6 +79,14 @@ TEST_F(CommandsTest, StallsAndResumes) {
   const auto client = Post();
   EXPECT_EQ(Execute("wait stalled 1"), "ok stalled=1");
   EXPECT_EQ(Execute("resume"), "ok resumed");
+  EXPECT_THAT(Ask(), StartsWith("HTTP/1.1 200 "));
+}
+
+TEST_F(CommandsTest, ResumingLeavesTheMisbehaviourOfTheNextRequests) {
+  EXPECT_EQ(Execute("misbehave http-status=503"), "ok misbehaving");
+  EXPECT_EQ(Execute("misbehave next 1 http-status=429"), "ok misbehaving next 1");
+  EXPECT_EQ(Execute("resume"), "ok resumed");
+  EXPECT_THAT(Ask(), StartsWith("HTTP/1.1 429 "));
   EXPECT_THAT(Ask(), StartsWith("HTTP/1.1 200 "));
 }
 
@@ -269,6 +278,24 @@ INSTANTIATE_TEST_SUITE_P(
         MisbehaviorCase{"Chunks", "chunks=7,5", "\r\n\r\n7\r\n"},
         MisbehaviorCase{"Close", "close", "\r\nConnection: close\r\n"}),
     [](const auto& test) { return std::string(test.param.name); });
+
+TEST_F(CommandsTest, HasAWrongClock) {
+  EXPECT_EQ(Execute("misbehave clock=+1h"), "ok misbehaving");
+  EXPECT_THAT(Ask(), HasSubstr("The Timestamp has expired"));
+  EXPECT_EQ(Execute("misbehave clock=-1h"), "ok misbehaving");
+  EXPECT_THAT(Ask(), HasSubstr("The Timestamp is in the future"));
+  // Within the skew that the service allows.
+  EXPECT_EQ(Execute("misbehave clock=-50s"), "ok misbehaving");
+  const std::string answer = Ask();
+  EXPECT_THAT(answer, HasSubstr(" IssueInstant=\""));
+  EXPECT_LT(answer.substr(answer.find(" IssueInstant=") + 15, 19), TimeFromNow(-40).substr(0, 19));
+  std::tm date{};
+  ASSERT_NE(
+      strptime(answer.c_str() + answer.find("\r\nDate: ") + 8, "%a, %d %b %Y %H:%M:%S", &date),
+      nullptr);
+  EXPECT_LT(timegm(&date), std::time(nullptr) - 40);
+  EXPECT_THAT(Execute("misbehave clock=10m"), HasSubstr("'10m' is not a sign and a time"));
+}
 
 TEST_F(CommandsTest, OmitsTheDateByName) {
   EXPECT_THAT(Ask(), HasSubstr("\r\nDate: "));

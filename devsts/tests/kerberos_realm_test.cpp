@@ -4,16 +4,20 @@
 #include <cerrno>
 #include <chrono>
 #include <cstdio>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <memory>
+#include <optional>
 #include <stdexcept>
 #include <string>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <signal.h>
+
+#include "program_process.h"
 
 namespace DevSts::Testing {
 namespace {
@@ -24,6 +28,30 @@ using namespace std::chrono_literals;
 struct Outcome {
   std::string output;
   int status = -1;
+};
+
+// An environment variable that has another value until the destructor restores it.
+class ReplacedVariable {
+ public:
+  ReplacedVariable(const char* name, const std::string& value) : name_(name) {
+    if (const char* before = std::getenv(name)) {
+      before_ = before;
+    }
+    ::setenv(name, value.c_str(), 1);
+  }
+  ~ReplacedVariable() {
+    if (before_) {
+      ::setenv(name_, before_->c_str(), 1);
+    } else {
+      ::unsetenv(name_);
+    }
+  }
+  ReplacedVariable(const ReplacedVariable&) = delete;
+  ReplacedVariable& operator=(const ReplacedVariable&) = delete;
+
+ private:
+  const char* const name_;
+  std::optional<std::string> before_;
 };
 
 Outcome RunInRealm(const KerberosRealm& realm, const std::string& command) {
@@ -97,6 +125,30 @@ TEST(KerberosRealmTest, RefusesNamesThatItsToolsWouldMisread) {
     EXPECT_THROW(realm.AddUser(name, "secret"), std::runtime_error) << name;
     EXPECT_THROW(realm.AddKeytab(name), std::runtime_error) << name;
   }
+}
+
+TEST(KerberosRealmTest, NamesAProgramThatIsNotInstalled) {
+  const ReplacedVariable path("PATH", "/nonexistent");
+  const ProgramResult result = RunProgram({"--realm"});
+  EXPECT_EQ(result.status, 1);
+  EXPECT_THAT(result.errors,
+              HasSubstr("'kinit' is not installed; a realm needs the packages krb5-kdc, "
+                        "krb5-admin-server and krb5-user\n"));
+}
+
+TEST(KerberosRealmTest, MayBeInAFolderWithABlank) {
+  const ScratchFolder scratch;
+  const std::string folder = scratch / "it's \"a\" blank";
+  ASSERT_TRUE(std::filesystem::create_directory(folder));
+  const ReplacedVariable temporary("TMPDIR", folder);
+  ProgramProcess program(
+      {"--realm", "--ready-file", scratch / "ready", "--user-keytabs", scratch / "keytabs"});
+  program.AwaitReady();
+  EXPECT_TRUE(FileExists(scratch / "keytabs/alice.keytab"));
+  // A shell reads the lines and finds the ticket of the first user.
+  const std::string lines = ". " + (scratch / "ready") + " && export KRB5_CONFIG=\"$krb5_config\" ";
+  EXPECT_EQ(std::system((lines + "&& klist -s -c \"$krb5_cache\"").c_str()), 0);
+  EXPECT_EQ(std::system((lines + "&& test \"$service\" = HTTP@localhost").c_str()), 0);
 }
 
 }  // namespace

@@ -56,6 +56,18 @@ TEST_F(NegotiationNamesTest, ChangeTheNumberOfLegs) {
               HasSubstr("The negotiation is configured to fail"));
 }
 
+TEST_F(NegotiationNamesTest, ChangeTheFaultOfALeg) {
+  EXPECT_THAT(
+      AnswersAfter("negotiation fail-at-leg=1 leg-fault=wsse:FailedAuthentication "
+                   "\"leg-fault-text=come back\" leg-fault-status=503"),
+      testing::AllOf(testing::StartsWith("HTTP/1.1 503 "), HasSubstr("wssecurity-secext-1.0.xsd"),
+                     HasSubstr(":FailedAuthentication</faultcode>"),
+                     HasSubstr("<faultstring>come back</faultstring>")));
+  for (const std::string name : {"leg-fault=sing:Code", "leg-fault=", "leg-fault-status=99"}) {
+    EXPECT_THAT(commands.Execute("negotiation " + name).line, testing::StartsWith("error leg-"));
+  }
+}
+
 TEST_F(NegotiationNamesTest, ChangeTheAnswersToLegs) {
   commands.Execute("negotiation request-mic");
   const auto answers = [&](const std::string& name) {

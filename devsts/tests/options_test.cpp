@@ -58,6 +58,14 @@ TEST(OptionsTest, TheHostsInNamesOfAttributesCanBeChosen) {
   EXPECT_THAT(after, HasSubstr(solution));
 }
 
+TEST(OptionsTest, ResumptionCanBeSwitchedOff) {
+  EXPECT_TRUE(Parse({}).server.tls.sessionResumption);
+  for (const std::vector<std::string>& arguments :
+       {std::vector<std::string>{"--no-resumption"}, {"--tls", "no-resumption"}}) {
+    EXPECT_FALSE(Parse(arguments).server.tls.sessionResumption) << arguments[0];
+  }
+}
+
 class NegotiationOptionsTest : public NegotiationFixture {
  protected:
   // The answer to the first leg of a login at a service with the keytab and these arguments.

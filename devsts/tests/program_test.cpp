@@ -391,7 +391,11 @@ INSTANTIATE_TEST_SUITE_P(
         WrongStart{"ForeignAddress",
                    {"--address", "203.0.113.1", "--expose-to-network"},
                    3,
-                   "WARNING: listening on 203.0.113.1"}),
+                   "WARNING: listening on 203.0.113.1"},
+        WrongStart{"MissingAddress",
+                   {"--address", "203.0.113.1", "--expose-to-network"},
+                   3,
+                   "--address 203.0.113.1 cannot be opened: Cannot assign requested address"}),
     [](const auto& test) { return std::string(test.param.name); });
 
 TEST(ProgramTest, ReportsAPortThatIsInUse) {
@@ -401,7 +405,8 @@ TEST(ProgramTest, ReportsAPortThatIsInUse) {
     const std::string port = std::to_string(PortIn(program.Value(scheme + "_url")));
     const ProgramResult second = RunProgram({"--" + scheme + "-port", port});
     EXPECT_EQ(second.status, 3);
-    EXPECT_THAT(second.errors, HasSubstr("a port cannot be opened: bind: Address already in use"));
+    EXPECT_THAT(second.errors, HasSubstr("ssoclient-devsts: --" + scheme + "-port " + port +
+                                         " cannot be opened: Address already in use\n"));
   }
 }
 
@@ -418,6 +423,8 @@ TEST(ProgramTest, HelpBeginsWithAnExample) {
   EXPECT_EQ(help.status, 0);
   EXPECT_THAT(help.output, StartsWith("Example:\n  ssoclient-devsts --background "));
   EXPECT_THAT(help.output, HasSubstr("FOR TESTS ONLY"));
+  EXPECT_THAT(help.output, HasSubstr("\nUsage: ssoclient-devsts [OPTIONS]\n"
+                                     "  or:  ssoclient-devsts control PATH COMMAND...\n"));
   EXPECT_EQ(RunProgram({"--help-misbehaviour"}).output, Program::MisbehaviorHelp());
   EXPECT_EQ(RunProgram({"control", "--help"}).output, Program::ControlHelp());
   EXPECT_EQ(RunProgram({"--help-control"}).output, Program::ControlHelp());

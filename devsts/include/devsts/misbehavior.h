@@ -94,6 +94,9 @@ struct Misbehavior {
   std::function<void(std::string& envelope)> editEnvelope;
   /// Applies to requests that are legs of a negotiation and that the service itself answers.
   LegMisbehavior leg;
+  /// The clock of the service is wrong by this much: in the Date, in what it accepts, and in
+  /// tokens. The ages of negotiations are not affected.
+  std::chrono::milliseconds clockOffset{0};
 
   /// Additional header fields of the answer; one Set-Cookie field for each of `setCookies`.
   std::vector<std::pair<std::string, std::string>> extraHeaders;

@@ -8,6 +8,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <system_error>
 #include <utility>
 #include <vector>
 
@@ -202,14 +203,26 @@ struct Counters {
   std::uint64_t delayed = 0;           ///< requests whose answer is being delayed now
 };
 
+/// One of the two ports cannot be opened.
+class PortError : public std::system_error {
+ public:
+  PortError(std::error_code code, bool overTls)
+      : std::system_error(code, overTls ? "the HTTPS port" : "the HTTP port"), overTls_(overTls) {}
+
+  bool IsOverTls() const { return overTls_; }
+
+ private:
+  bool overTls_;
+};
+
 /// The service. It listens on one HTTP and one HTTPS port from construction to destruction and uses
 /// one thread for each connection, up to about 2,000 connections at once. Connections wait while
 /// the system has no file descriptor for them, and are closed if it has no thread. All members are
 /// thread-safe.
 class Server {
  public:
-  /// Throws `std::runtime_error` if a port cannot be opened, a certificate cannot be made or the
-  /// keytab has no key.
+  /// Throws `PortError` if a port cannot be opened, and `std::runtime_error` if a certificate
+  /// cannot be made or the keytab has no key.
   explicit Server(ServerOptions options = {});
   /// Stops accepting, ends every connection and waits for their threads.
   ~Server();

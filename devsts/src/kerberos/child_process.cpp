@@ -22,6 +22,8 @@ namespace {
 
 // How long a process may take to end after SIGTERM.
 constexpr auto kPatience = std::chrono::seconds(5);
+// The exit status of a process whose program cannot be executed.
+constexpr int kNotExecuted = 127;
 
 [[noreturn]] void ThrowSystemError(const std::string& attempt) {
   throw std::runtime_error(attempt + ": " + std::strerror(errno));
@@ -85,7 +87,7 @@ pid_t Start(const Command& command) {
     ::dup2(output, STDOUT_FILENO);
     ::dup2(output, STDERR_FILENO);
     ::execvpe(arguments[0], arguments.data(), variables.data());
-    ::_exit(127);
+    ::_exit(kNotExecuted);
   }
   ::close(input);
   ::close(output);
@@ -111,6 +113,11 @@ std::string TextOf(const std::string& path) {
 
 void RunToEnd(const Command& command) {
   const int status = WaitForEnd(Start(command));
+  if (WIFEXITED(status) && WEXITSTATUS(status) == kNotExecuted) {
+    throw std::runtime_error(
+        "'" + command.arguments[0] +
+        "' is not installed; a realm needs the packages krb5-kdc, krb5-admin-server and krb5-user");
+  }
   if (!WIFEXITED(status) || WEXITSTATUS(status) != 0) {
     throw std::runtime_error("'" + command.arguments[0] +
                              "' failed: " + TextOf(command.outputPath));

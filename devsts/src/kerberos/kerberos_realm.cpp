@@ -60,6 +60,15 @@ void WriteFile(const std::string& path, const std::string& text) {
   }
 }
 
+// The text as one word of a query of kadmin.local, in which two quotation marks mean one.
+std::string QueryWord(const std::string& text) {
+  std::string word = "\"";
+  for (const char c : text) {
+    word += c == '"' ? "\"\"" : std::string(1, c);
+  }
+  return word + "\"";
+}
+
 // Returns the name. Throws if a configuration file or a command of the tools would misread it.
 std::string Checked(const std::string& name) {
   if (name.empty() || name.front() == '-' ||
@@ -191,12 +200,12 @@ void KerberosRealm::AddUser(const std::string& name, const std::string& password
 std::string KerberosRealm::AddKeytab(const std::string& principal) {
   std::string path = state_->folder + "/keytab-" + std::to_string(++state_->keytabs) + ".keytab";
   state_->Administer("addprinc -randkey " + Checked(principal));
-  state_->Administer("ktadd -k " + path + " " + Checked(principal));
+  state_->Administer("ktadd -k " + QueryWord(path) + " " + Checked(principal));
   return path;
 }
 
 void KerberosRealm::WriteKeytab(const std::string& principal, const std::string& path) {
-  state_->Administer("ktadd -norandkey -k " + Checked(path) + " " + Checked(principal));
+  state_->Administer("ktadd -norandkey -k " + QueryWord(path) + " " + Checked(principal));
 }
 
 std::string KerberosRealm::Login(const std::string& name, const std::string& password,

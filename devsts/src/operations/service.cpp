@@ -79,11 +79,12 @@ Service::Service(const ServerOptions& options, Credential signing)
       negotiator_(options.negotiation),
       shape_(options.assertion) {}
 
-SoapReply Service::Answer(const ReceivedRequest& request, const LegMisbehavior& misbehavior) {
+SoapReply Service::Answer(const ReceivedRequest& request, const LegMisbehavior& misbehavior,
+                          Time now) {
   Seen seen;
   SoapReply reply;
   try {
-    reply = Handle(request, misbehavior, seen);
+    reply = Handle(request, misbehavior, now, seen);
   } catch (const Fault& fault) {
     reply = AnswerFault(fault.Answer());
   } catch (const std::exception& error) {
@@ -96,11 +97,11 @@ SoapReply Service::Answer(const ReceivedRequest& request, const LegMisbehavior& 
 }
 
 SoapReply Service::Handle(const ReceivedRequest& received, const LegMisbehavior& misbehavior,
-                          Seen& seen) {
+                          Time now, Seen& seen) {
   const Operation operation = OperationOf(ReadSoapAction(received));
   const bool continues = operation == Operation::Continue;
-  CheckedRequest request =
-      Check(received, continues ? "RequestSecurityTokenResponse" : "RequestSecurityToken", seen);
+  CheckedRequest request = Check(
+      received, continues ? "RequestSecurityTokenResponse" : "RequestSecurityToken", now, seen);
   if (operation == Operation::Issue) {
     return AnswerIssue(std::move(request), received, misbehavior, seen);
   }
@@ -115,9 +116,9 @@ SoapReply Service::Handle(const ReceivedRequest& received, const LegMisbehavior&
   return reply;
 }
 
-CheckedRequest Service::Check(const ReceivedRequest& received, const char* entryName,
+CheckedRequest Service::Check(const ReceivedRequest& received, const char* entryName, Time now,
                               Seen& seen) const {
-  CheckedRequest request{ReadEnvelope(received.body, entryName), {}, {}, Shape(), Now()};
+  CheckedRequest request{ReadEnvelope(received.body, entryName), {}, {}, Shape(), now};
   request.header = ReadSecurityHeader(request.soap.header);
   seen.signature = SignatureFormOf(request.header);
   RequireFresh(request.header, request.now, parts_.clockSkew);

@@ -32,8 +32,8 @@ class Service {
   // Throws GssError if the keytab of the options has no key.
   Service(const ServerOptions& options, Credential signing);
 
-  // `misbehavior` applies to the legs of negotiations.
-  SoapReply Answer(const ReceivedRequest& request, const LegMisbehavior& misbehavior);
+  // `misbehavior` applies to the legs of negotiations, at this time.
+  SoapReply Answer(const ReceivedRequest& request, const LegMisbehavior& misbehavior, Time now);
   static SoapReply AnswerFault(const FaultAnswer& fault);
 
   void SetUsers(Users users) { parts_.accounts.Set(std::move(users)); }
@@ -52,8 +52,10 @@ class Service {
     std::optional<ReceivedLeg> leg;
   };
 
-  SoapReply Handle(const ReceivedRequest& request, const LegMisbehavior& misbehavior, Seen& seen);
-  CheckedRequest Check(const ReceivedRequest& request, const char* entryName, Seen& seen) const;
+  SoapReply Handle(const ReceivedRequest& request, const LegMisbehavior& misbehavior, Time now,
+                   Seen& seen);
+  CheckedRequest Check(const ReceivedRequest& request, const char* entryName, Time now,
+                       Seen& seen) const;
   SoapReply AnswerIssue(CheckedRequest request, const ReceivedRequest& received,
                         const LegMisbehavior& misbehavior, Seen& seen);
   SoapReply AnswerContinued(const CheckedRequest& request, const ReceivedRequest& received,

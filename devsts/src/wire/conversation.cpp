@@ -1,7 +1,7 @@
 #include "wire/conversation.h"
 
 #include <algorithm>
-#include <ctime>
+#include <chrono>
 
 namespace DevSts {
 
@@ -45,21 +45,23 @@ bool Conversation::ServeOne() {
   }
   Describe(request);
   const Misbehavior misbehavior = parts_.plan.TakeForRequest();
-  const SoapReply reply = Decide(request, misbehavior);
-  const WireAnswer wire = MakeWireAnswer(reply, misbehavior, keepAlive, std::time(nullptr));
+  const Time now = Now() + misbehavior.clockOffset;
+  const SoapReply reply = Decide(request, misbehavior, now);
+  const WireAnswer wire =
+      MakeWireAnswer(reply, misbehavior, keepAlive, std::chrono::system_clock::to_time_t(now));
   Record(request, reply, wire, misbehavior);
   return Delay(misbehavior.delayBeforeAnswer) && Send(wire, misbehavior);
 }
 
-SoapReply Conversation::Decide(const ReceivedRequest& request,
-                               const Misbehavior& misbehavior) const {
+SoapReply Conversation::Decide(const ReceivedRequest& request, const Misbehavior& misbehavior,
+                               Time now) const {
   if (misbehavior.rawAnswer || misbehavior.httpAnswer) {
     return {};
   }
   if (misbehavior.fault) {
     return Service::AnswerFault(*misbehavior.fault);
   }
-  return parts_.service.Answer(request, misbehavior.leg);
+  return parts_.service.Answer(request, misbehavior.leg, now);
 }
 
 void Conversation::Describe(ReceivedRequest& request) {

@@ -10,6 +10,7 @@
 #include "wire/misbehavior_plan.h"
 #include "wire/observation.h"
 #include "wire/wire_answer.h"
+#include "xml/schema_values.h"
 
 namespace DevSts {
 
@@ -32,7 +33,7 @@ class Conversation {
  private:
   bool Begin();
   bool ServeOne();
-  SoapReply Decide(const ReceivedRequest& request, const Misbehavior& misbehavior) const;
+  SoapReply Decide(const ReceivedRequest& request, const Misbehavior& misbehavior, Time now) const;
   // Fills in the properties of the connection.
   void Describe(ReceivedRequest& request);
   void Record(ReceivedRequest& request, const SoapReply& reply, const WireAnswer& wire,
