@@ -188,7 +188,6 @@ TEST_F(NegotiatedLoginTest, ServesLoginsInSequence) {
 // The parent has threads of the pool and its child has not; the handler is the same.
 TEST_F(NegotiatedLoginTest, WorksInAForkedChild) {
   ASSERT_NE(AcquireAsynchronously(), nullptr);
-  Tarnik::Testing::AwaitIdleThreads();
   EXPECT_TRUE(Tarnik::Testing::HoldsInChild([this] {
     return Acquire({}) != nullptr && handler_->IsEstablished() &&
            AcquireAsynchronously() != nullptr && handler_->IsEstablished() &&

@@ -19,6 +19,7 @@ namespace SsoClient::Testing {
 namespace {
 
 using Tarnik::System::GetThreadPool;
+using Tarnik::Testing::HoldsInChild;
 
 constexpr char kNoThread[] = "Cannot start a thread: Resource temporarily unavailable.";
 
@@ -32,12 +33,6 @@ bool RunsAnItem() {
   GetThreadPool()->Run([&] { done.set_value(); });
   done.get_future().wait();
   return true;
-}
-
-template <class Check>
-bool HoldsInChild(const Check& check) {
-  Tarnik::Testing::AwaitIdleThreads();
-  return Tarnik::Testing::HoldsInChild(check);
 }
 
 template <class Start>

@@ -10,17 +10,11 @@
 namespace SsoClient::Testing {
 namespace {
 
+using Tarnik::Testing::HoldsInChild;
+
 class NegotiationForkTest : public RealmTest {
  protected:
   NegotiationForkTest() { Sts().SetNegotiationScript(TwoLegs()); }
-
-  /// Runs `check` in a child of this process, whose threads are idle: the dev STS and the pool of
-  /// the library.
-  template <class Check>
-  static bool HoldsInChild(const Check& check) {
-    Tarnik::Testing::AwaitIdleThreads();
-    return Tarnik::Testing::HoldsInChild(check);
-  }
 
   static bool IsOfAlice(const std::shared_ptr<const SamlToken>& token) {
     return token != nullptr && token->Subject().name == "alice";

@@ -39,7 +39,6 @@ class TrustProcessTest : public TrustFixture {
 
 TEST_F(TrustProcessTest, ChildWatchesAgainWhenItUsesTheStore) {
   MakeWithSystem();
-  AwaitIdleThreads();
   EXPECT_TRUE(HoldsInChild([this] {
     const auto version = store->Version();
     Put("trust/a.pem", Sts(1).Pem());
@@ -112,7 +111,6 @@ TEST_F(TrustProcessTest, ChildIsForkedWhileThreadsUseTheStore) {
 
 TEST_F(TrustProcessTest, ChildMayDestroyTheStore) {
   MakeWithSystem();
-  AwaitIdleThreads();
   EXPECT_TRUE(HoldsInChild([this] {
     store.reset();
     return true;

@@ -64,7 +64,7 @@ TEST(ObjectLockTest, IsFreeInAChildThatIsForkedWhileItIsHeld) {
   });
   locked.get_future().wait();
   for (int i = 0; i < 20; ++i) {
-    EXPECT_TRUE(HoldsInChild([&] {
+    EXPECT_TRUE(HoldsInChildOfBusyThreads([&] {
       const std::lock_guard lock(ObjectLock(&object));
       return true;
     })) << i;
@@ -90,7 +90,7 @@ TEST(OpenSslSectionTest, IsEmptyWhenAChildIsForked) {
   });
   entered.get_future().wait();
   for (int i = 0; i < 20; ++i) {
-    EXPECT_TRUE(HoldsInChild([&] {
+    EXPECT_TRUE(HoldsInChildOfBusyThreads([&] {
       const OpenSsl::Section section;
       return !isInside;
     })) << i;

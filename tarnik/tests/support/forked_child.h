@@ -5,10 +5,13 @@
 
 namespace Tarnik::Testing {
 
-/// Runs `check` in a forked child, which ends with it. Returns true when it returned true; false
-/// also when it threw or took longer than a minute.
+/// Waits until the other threads sleep, and runs `check` in a forked child, which ends with it.
+/// Returns true when it returned true; false also when it threw or took longer than a minute.
 template <class Check>
 bool HoldsInChild(const Check& check);
+/// The same while other threads run. They and `check` must not allocate (`AwaitIdleThreads`).
+template <class Check>
+bool HoldsInChildOfBusyThreads(const Check& check);
 
 /// Waits for a child and returns true when it ended with status 0.
 bool HasSucceeded(pid_t child);
@@ -22,6 +25,12 @@ void AwaitIdleThreads();
 
 template <class Check>
 bool HoldsInChild(const Check& check) {
+  AwaitIdleThreads();
+  return HoldsInChildOfBusyThreads(check);
+}
+
+template <class Check>
+bool HoldsInChildOfBusyThreads(const Check& check) {
   const pid_t child = ForkWithLimit();
   if (child != 0) {
     return HasSucceeded(child);

@@ -70,6 +70,7 @@ TEST(ForkedChildTest, ChildThatReturnsFromAnItemEnds) {
   for (const bool isItem : {true, false}) {
     std::promise<pid_t> forked;
     const auto body = [&forked] {
+      AwaitIdleThreads();
       if (const pid_t child = ForkWithLimit(); child != 0) {
         forked.set_value(child);
         return;
