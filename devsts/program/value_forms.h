@@ -22,7 +22,7 @@ std::uint64_t NumberFrom(const std::string& text,
 bool FlagFrom(const std::string& text);
 // A number and a unit: ms, s, m, h or d.
 std::chrono::milliseconds TimeFrom(const std::string& text);
-// A sign and a time.
+// Reads a sign and a duration, such as "+10m" or "-90s".
 std::chrono::milliseconds OffsetFrom(const std::string& text);
 // A text with the escapes \r, \n, \t, \\ and \xHH.
 std::string OctetsFrom(const std::string& text);

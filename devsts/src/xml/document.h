@@ -51,7 +51,7 @@ bool HasAttribute(const xmlNode* element, const char* name, const char* uri = nu
 
 // The child elements in document order.
 std::vector<xmlNode*> ChildElements(const xmlNode* element);
-// The first child element of this name; null if there is none.
+// Returns the first child element with this name, or null if the parent has no such child.
 xmlNode* FirstChild(const xmlNode* parent, std::string_view namespaceUri,
                     std::string_view localName);
 

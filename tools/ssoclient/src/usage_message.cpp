@@ -30,7 +30,7 @@ std::string MessageWithoutCommand(int argc, const char* const* argv) {
                          : "there is no command '" + first + "'";
 }
 
-// Whether the command has the option, which is before its name in the arguments.
+// Returns whether the command has the option, and it is before the command in the arguments.
 bool IsBeforeCommand(const std::string& option, const CLI::App& command,
                      const std::vector<std::string>& arguments) {
   const auto end = std::find(arguments.begin(), arguments.end(), command.get_name());
@@ -39,7 +39,7 @@ bool IsBeforeCommand(const std::string& option, const CLI::App& command,
                      [&](const std::string& each) { return NameOfOption(each) == option; });
 }
 
-// Arguments that the command does not have, or not there.
+// For arguments that the command does not have, or that are before its name.
 std::string MessageOfExtras(const std::vector<std::string>& extras, const CLI::App& command,
                             const std::vector<std::string>& arguments) {
   const auto extra = std::find_if(extras.begin(), extras.end(), IsOption);

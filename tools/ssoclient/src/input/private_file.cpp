@@ -15,7 +15,7 @@
 namespace SsoClient::Tool {
 namespace {
 
-// A buffer that is overwritten at its end.
+// A buffer that its destructor overwrites.
 struct CleansedBuffer {
   explicit CleansedBuffer(std::size_t size) : octets(size, '\0') {}
   ~CleansedBuffer() { Tarnik::StringUtil::Cleanse(octets); }

@@ -17,7 +17,7 @@ namespace {
 constexpr double kShortestTimeoutSec = 0.1;
 constexpr double kLongestTimeoutSec = 3600;
 
-// A number, or what ParseDuration reads; null for anything else.
+// Reads a number of seconds, or a duration as ParseDuration does.
 std::optional<double> SecondsOf(const std::string& text) {
   double seconds = 0;
   if (CLI::detail::lexical_cast(text, seconds)) {
@@ -27,7 +27,7 @@ std::optional<double> SecondsOf(const std::string& text) {
   return duration ? std::optional<double>(duration->count()) : std::nullopt;
 }
 
-// Replaces the text by its seconds.
+// Replaces a duration with its number of seconds.
 CLI::Validator TimeoutTransform() {
   return CLI::Validator(
       [](std::string& text) -> std::string {

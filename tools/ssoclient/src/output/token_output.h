@@ -25,9 +25,10 @@ struct Deviation {
   std::string issued{};     ///< for people
 };
 
-/// The fields of a token that differ from `spec`, in what was issued at `now`. The lifetime differs
-/// if neither the time from the start nor that from `now` is the requested one, by more than a
-/// hundredth and two seconds: a service may set the start back, and clocks may differ.
+/// Returns the fields of a token, issued at `now`, that differ from `spec`. The lifetime is
+/// compared from the token's start and from `now`, with a tolerance of one percent plus two
+/// seconds, and differs only if neither matches: a service may set the start back, and clocks may
+/// differ.
 std::vector<Deviation> FindDeviations(const SamlToken& token, const TokenSpec& spec, bool isBearer,
                                       const Tarnik::System::DateTime& now);
 
