@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include "failure.h"
+#include "input/decimal_text.h"
 #include "input/descriptor.h"
 #include "input/private_file.h"
 #include "input/terminal.h"
@@ -20,11 +21,7 @@ constexpr std::size_t kMaxSecretFileBytes = std::size_t{64} * 1024;
 // The library's own texts contain the value, which may be the secret itself by mistake.
 std::string CheckDescriptor(const std::string& text) {
   constexpr std::size_t kMostDigits = 9;
-  // The library reads "010" as eight.
-  const bool isOctal = text.size() > 1 && text.front() == '0';
-  const bool isNumber = !text.empty() && !isOctal && text.size() <= kMostDigits &&
-                        text.find_first_not_of("0123456789") == std::string::npos;
-  return isNumber ? std::string() : "it must be the number of a descriptor";
+  return IsDecimal(text, kMostDigits) ? std::string() : "it must be the number of a descriptor";
 }
 
 // One byte at a time, since the rest belongs to others.

@@ -8,6 +8,7 @@
 #include <tarnik/core/exception.h>
 
 #include "failure.h"
+#include "input/decimal_text.h"
 #include "options/duration_checks.h"
 #include "output/duration_text.h"
 
@@ -27,14 +28,9 @@ std::string CheckTimeText(const std::string& text) {
   }
 }
 
-// Unlike the library's own conversion, this refuses "-1", which some of its versions wrap around.
 std::string CheckCount(const std::string& text) {
   constexpr std::size_t kMostDigits = 15;
-  // The library reads "010" as eight.
-  const bool isOctal = text.size() > 1 && text.front() == '0';
-  const bool isCount = !text.empty() && !isOctal && text.size() <= kMostDigits &&
-                       text.find_first_not_of("0123456789") == std::string::npos;
-  return isCount ? std::string() : "'" + text + "' is not a whole number";
+  return IsDecimal(text, kMostDigits) ? std::string() : "'" + text + "' is not a whole number";
 }
 
 std::string CheckPositiveCount(const std::string& text) {
