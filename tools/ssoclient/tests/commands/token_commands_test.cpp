@@ -179,6 +179,7 @@ TEST_F(TokenCommandsTest, ValidateSaysWhatTheServiceSays) {
   const nlohmann::json json = RunTool(Joined(command, {"--json"})).Json();
   EXPECT_EQ(json["isValid"], false);
   EXPECT_EQ(json["status"], "refused");
+  EXPECT_FALSE(json.contains("error"));
 }
 
 // The names of docs/tool.md.

@@ -74,6 +74,7 @@ class VerifyTest : public ::testing::Test {
     options.push_back("--json");
     const Json json = VerifyForAudience(text, options).Json();
     EXPECT_EQ(json.at("status"), "refused");
+    EXPECT_FALSE(json.contains("error"));
     EXPECT_EQ(json.at("isAccepted"), false);
     EXPECT_EQ(json.at("reason"), reason);
     EXPECT_EQ(json.at("remedy"), remedy);

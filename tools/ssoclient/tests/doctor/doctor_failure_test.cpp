@@ -1,20 +1,13 @@
 // Findings about services and machines that fail between two steps, each produced for real.
 #include <atomic>
-#include <cerrno>
-#include <cstddef>
-#include <cstdint>
 #include <fstream>
-#include <iterator>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <linux/filter.h>
-#include <linux/seccomp.h>
 #include <poll.h>
-#include <sys/prctl.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -23,6 +16,7 @@
 #include "devsts/server.h"
 #include "support/doctor_run.h"
 #include "support/peer.h"
+#include "support/refused_call.h"
 #include "support/temporary_file.h"
 #include "support/test_pki.h"
 
@@ -109,25 +103,10 @@ TEST(DoctorFailureTest, TooFewResourcesAreFound) {
   EXPECT_EQ(run.Status(), 4);
 }
 
-// Lets the system refuse what event loops need, as a system without descriptors does. Sanitizers do
-// not use it themselves.
-void RefuseEventLoops() {
-  constexpr auto kNumber = static_cast<std::uint32_t>(offsetof(seccomp_data, nr));
-  sock_filter instructions[] = {{BPF_LD | BPF_W | BPF_ABS, 0, 0, kNumber},
-                                {BPF_JMP | BPF_JEQ | BPF_K, 0, 1, __NR_epoll_create1},
-                                {BPF_RET | BPF_K, 0, 0, SECCOMP_RET_ERRNO | EMFILE},
-                                {BPF_RET | BPF_K, 0, 0, SECCOMP_RET_ALLOW}};
-  const sock_fprog program{static_cast<unsigned short>(std::size(instructions)), instructions};
-  if (prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) != 0 ||
-      prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) != 0) {
-    _exit(1);
-  }
-}
-
 TEST(DoctorFailureTest, AThreadPoolThatCannotStartIsFound) {
   const Service service;
   ToolOptions options = service.Run({});
-  options.prepare = RefuseEventLoops;
+  options.prepare = [] { RefuseSystemCall(__NR_epoll_create1); };  // which event loops need
   const DoctorRun run(options);
   ExpectFailure(run, "certificate", "local-failure", 4, "http");
   EXPECT_THAT(run.Message("certificate"), HasSubstr("Too many open files"));

@@ -4,7 +4,10 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
+#include <sys/syscall.h>
 
+#include "support/refused_call.h"
 #include "support/service_fixture.h"
 
 namespace SsoClient::Tool::Testing {
@@ -46,6 +49,25 @@ TEST_F(ServiceCallTest, ASignalDuringARenewalLeavesTheToken) {
   const std::vector<std::string> before = FilesInFolder();
   EXPECT_EQ(Interrupt(Command("renew", Joined(Key(), {path})), SIGTERM).signal, SIGTERM);
   EXPECT_EQ(Content(path), token);
+  EXPECT_EQ(FilesInFolder(), before);
+}
+
+TEST_F(ServiceCallTest, ACallThatCannotBeWaitedForIsNotMade) {
+  const std::vector<std::string> before = FilesInFolder();
+  const auto requests = Sts().Requests().size();
+  const auto logInWithout = [&](void (*refuse)()) {
+    ToolOptions options;
+    options.arguments = PasswordLogin({"--json", "-o", PathOf("token")});
+    options.prepare = refuse;
+    const ToolResult result = RunTool(options);
+    EXPECT_EQ(result.status, 4) << result.err;
+    return result.Json()["error"]["message"].get<std::string>();
+  };
+  EXPECT_EQ(logInWithout([] { RefuseSystemCall(__NR_signalfd4); }),
+            "cannot wait for signals: Too many open files");
+  EXPECT_EQ(logInWithout([] { RefuseSystemCall(__NR_eventfd2); }),
+            "cannot wait for the service: Too many open files");
+  EXPECT_EQ(Sts().Requests().size(), requests);
   EXPECT_EQ(FilesInFolder(), before);
 }
 

@@ -38,6 +38,7 @@ DoctorRun::DoctorRun(const ToolOptions& options) {
   if (json_->is_discarded()) {
     throw std::runtime_error("not JSON: " + text_);
   }
+  EXPECT_FALSE(json_->contains("error") && json_->contains("steps")) << text_;
   CompareWithPage(Contains(options.arguments, "--strict"));
 }
 
