@@ -72,7 +72,7 @@ Failure MakeFailure(FailureKind kind, std::string message, const Tarnik::Excepti
 
 Failure FailureOf(const std::exception& exception) {
   if (const auto* own = dynamic_cast<const ToolException*>(&exception)) {
-    return own->What();
+    return own->GetFailure();
   }
   if (const auto* known = dynamic_cast<const Tarnik::Exception*>(&exception)) {
     return MakeFailure(Access::Classify(*known), known->what(), *known);

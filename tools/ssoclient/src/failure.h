@@ -27,7 +27,7 @@ struct Failure {
 class ToolException : public std::runtime_error {
  public:
   explicit ToolException(Failure failure);
-  const Failure& What() const noexcept { return failure_; }
+  const Failure& GetFailure() const noexcept { return failure_; }
 
  private:
   Failure failure_;

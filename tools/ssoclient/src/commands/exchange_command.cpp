@@ -9,13 +9,13 @@
 
 #include "commands/bound_token.h"
 #include "commands/commands.h"
+#include "commands/token_output.h"
 #include "input/private_file.h"
 #include "input/standard_input.h"
 #include "input/token_file.h"
 #include "options/key_options.h"
 #include "options/request_options.h"
 #include "options/service_options.h"
-#include "output/token_output.h"
 #include "service/service_call.h"
 
 namespace SsoClient::Tool {

@@ -8,6 +8,7 @@
 #include <tarnik/system/date_time.h>
 
 #include "commands/commands.h"
+#include "commands/token_output.h"
 #include "failure.h"
 #include "input/private_file.h"
 #include "input/secret.h"
@@ -16,7 +17,6 @@
 #include "options/key_options.h"
 #include "options/request_options.h"
 #include "options/service_options.h"
-#include "output/token_output.h"
 #include "service/service_call.h"
 
 namespace SsoClient::Tool {

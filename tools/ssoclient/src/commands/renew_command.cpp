@@ -10,6 +10,7 @@
 
 #include "commands/bound_token.h"
 #include "commands/commands.h"
+#include "commands/token_output.h"
 #include "failure.h"
 #include "input/private_file.h"
 #include "input/standard_input.h"
@@ -17,7 +18,6 @@
 #include "options/key_options.h"
 #include "options/request_options.h"
 #include "options/service_options.h"
-#include "output/token_output.h"
 #include "service/service_call.h"
 
 namespace SsoClient::Tool {
@@ -81,7 +81,7 @@ Token Renew(const Console& console, const ServiceSetup& setup, const Token& toke
       return service.RenewToken(*token, lifetimeSec);
     });
   } catch (const ToolException& exception) {
-    Failure failure = exception.What();
+    Failure failure = exception.GetFailure();
     if (failure.status == ExitStatus::kRefused && !token->IsRenewable()) {
       failure.remedy = "the token is not renewable: log in with --renewable";
     }

@@ -42,14 +42,8 @@ Finding UnknownIssuer(const ChainFacts& facts) {
     return Untrusted("self-signed", "the certificate of the service is self-signed",
                      "have it issued by a CA, or check its fingerprint and give it as --ca");
   }
-  if (last.isSelfIssued) {
-    return Untrusted("unknown-ca", "the CA " + last.subject + " of the service is not trusted",
-                     "get the certificate of " + last.subject +
-                         " from a trusted source, and give "
-                         "it as --ca");
-  }
-  if (facts.links.size() > 1) {
-    return Untrusted("unknown-ca", "the CA that is needed is not trusted: " + needed,
+  if (last.isSelfIssued || facts.links.size() > 1) {
+    return Untrusted("unknown-ca", "the CA " + needed + " of the service is not trusted",
                      "get the certificate of " + needed +
                          " from a trusted source, and give it "
                          "as --ca");

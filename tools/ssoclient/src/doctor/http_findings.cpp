@@ -6,6 +6,8 @@
 
 #include <tarnik/text/display_text.h>
 
+#include "service/exchange_notes.h"
+
 namespace SsoClient::Tool::Doctor {
 namespace {
 
@@ -108,8 +110,7 @@ bool IsHtml(const HttpAnswer& answer) {
 Finding FindingOfHttp(const HttpAnswer& answer, const std::string& path) {
   const std::string status = "HTTP status " + std::to_string(answer.status) +
                              (answer.reason.empty() ? "" : " " + answer.reason);
-  // The library reads faults only from 500 and successes, so other statuses are failures.
-  const bool isRead = answer.status == 500 || (answer.status >= 200 && answer.status < 300);
+  const bool isRead = IsReadStatus(answer.status);
   if (isRead && LooksLikeSoap(answer)) {
     return Fine(status + " with a SOAP envelope");
   }

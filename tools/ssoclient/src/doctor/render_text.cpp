@@ -1,10 +1,10 @@
-#include <algorithm>
 #include <array>
 #include <cstdio>
 #include <ostream>
 
 #include "doctor/render.h"
 #include "output/safe_text.h"
+#include "output/text_width.h"
 
 namespace SsoClient::Tool::Doctor {
 namespace {
@@ -23,11 +23,6 @@ Colour ColourOf(StepOutcome outcome) {
   return Colour::kFaint;
 }
 
-std::string Padded(std::string text, std::size_t width) {
-  text.resize(std::max(text.size(), width), ' ');
-  return text;
-}
-
 std::string DurationText(const Step& step) {
   if (step.finding.outcome == StepOutcome::kSkipped) {
     return std::string(9, ' ');
@@ -42,8 +37,8 @@ void PrintStep(const Console& console, const Step& step) {
   const Finding& finding = step.finding;
   const bool isProblem =
       finding.outcome == StepOutcome::kFailed || finding.outcome == StepOutcome::kWarning;
-  console.out << console.Paint(ColourOf(finding.outcome), Padded(NameOf(finding.outcome), 8))
-              << Padded(step.name, 12) << DurationText(step) << "  "
+  console.out << console.Paint(ColourOf(finding.outcome), PaddedTo(NameOf(finding.outcome), 8))
+              << PaddedTo(step.name, 12) << DurationText(step) << "  "
               << (isProblem ? finding.name + ": " : "") << SafeText(console, finding.message)
               << '\n';
   for (const std::string& line : step.lines) {

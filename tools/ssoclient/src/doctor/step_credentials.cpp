@@ -71,7 +71,7 @@ Step ExamineIdentity(Examination& examination) {
   try {
     examination.identity = Load(examination);
   } catch (const ToolException& exception) {
-    step.finding = KeyProblem(exception.What());
+    step.finding = KeyProblem(exception.GetFailure());
     return step;
   }
   const Certificate& certificate = *examination.identity->certificate;
@@ -92,7 +92,7 @@ Step ExamineKeytab(const Plan& plan) {
     plan.checkKeytab();
     step.finding = Fine("the keytab can be read");
   } catch (const ToolException& exception) {
-    const Tool::Failure& failure = exception.What();
+    const Tool::Failure& failure = exception.GetFailure();
     step.finding = Failure(failure.status, FindingName::FindOr(failure.kind, "file-unreadable"),
                            failure.message,
                            failure.remedy.empty() ? "check the file of --keytab" : failure.remedy);

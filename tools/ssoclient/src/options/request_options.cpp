@@ -72,7 +72,7 @@ TokenSpec RequestOptions::MakeSpec(bool mayBeOpen) const {
 
 void RethrowWithRemedy(const ToolException& exception, const TokenSpec& spec,
                        const SamlToken* own) {
-  Failure failure = exception.What();
+  Failure failure = exception.GetFailure();
   const bool isRefused = failure.status == ExitStatus::kRefused;
   if (isRefused && spec.actAsToken && !(*spec.actAsToken)->IsDelegable()) {
     failure.remedy =

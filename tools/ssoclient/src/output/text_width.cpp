@@ -1,7 +1,6 @@
 #include "output/text_width.h"
 
 #include <algorithm>
-#include <clocale>
 #include <cwchar>
 
 #include <locale.h>

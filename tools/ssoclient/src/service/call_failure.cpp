@@ -28,11 +28,6 @@ bool Is(const Tarnik::Exception& exception) {
   return dynamic_cast<const Class*>(&exception) != nullptr;
 }
 
-// Whether the client reads answers with this status (SOAP 1.1, section 6.2).
-bool IsReadStatus(int status) {
-  return status == kInternalServerError || (status >= 200 && status <= 299);
-}
-
 FailureKind KindOfExchange(const ExchangeNotes& notes) {
   if (const auto* cause = dynamic_cast<const Tarnik::Exception*>(notes.failure.get())) {
     return Access::Classify(*cause);

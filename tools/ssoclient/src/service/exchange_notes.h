@@ -20,6 +20,12 @@ struct ExchangeNotes {
   int httpStatus = 0;  ///< of the last answer; 0 without one
 };
 
+/// Whether the client reads the bodies of answers with this HTTP status: those of successes, and of
+/// 500, which has faults (SOAP 1.1, section 6.2).
+constexpr bool IsReadStatus(int status) {
+  return status == 500 || (status >= 200 && status <= 299);
+}
+
 /// An agent that sends by `inner` and writes to `notes` how exchanges end. It is used by one thread
 /// at a time, and keeps `notes` alive.
 Tarnik::Ref<Tarnik::Http::UserAgent> CreateNotingUserAgent(Tarnik::Http::UserAgent* inner,

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "output/duration_text.h"
+#include "token/confirmation_name.h"
 #include "token/unverified_token.h"
 #include "token/validity.h"
 
@@ -87,7 +88,7 @@ void AddValidity(const SamlToken& token, const DateTime& now, Json& json) {
 
 void AddKeys(const SamlToken& token, Json& json) {
   const auto holder = token.HolderOfKeyCertificate();
-  json["confirmation"] = holder == nullptr ? "bearer" : "holder-of-key";
+  json["confirmation"] = ConfirmationName(token.ConfirmationType());
   if (holder != nullptr) {
     json["holder"] = CertificateJson(*holder);
   }

@@ -30,7 +30,7 @@ std::string KindOf(const PrivateFile& file) {
   try {
     ReadPrivateFile(file);
   } catch (const ToolException& exception) {
-    return exception.What().kind;
+    return exception.GetFailure().kind;
   }
   return "";
 }
@@ -82,8 +82,8 @@ TEST(PrivateFileTest, NoDeviceIsToBeChanged) {
     ReadPrivateFile({.path = "/dev/null", .what = "key"});
     ADD_FAILURE() << "a device that everybody can write to was accepted";
   } catch (const ToolException& exception) {
-    EXPECT_EQ(exception.What().kind, "key-file-open");
-    EXPECT_EQ(exception.What().remedy.find("chmod"), std::string::npos);
+    EXPECT_EQ(exception.GetFailure().kind, "key-file-open");
+    EXPECT_EQ(exception.GetFailure().remedy.find("chmod"), std::string::npos);
   }
 }
 

@@ -31,7 +31,7 @@ Failure FailureIn(Call call) {
   try {
     call();
   } catch (const ToolException& exception) {
-    return exception.What();
+    return exception.GetFailure();
   }
   Failure none{ExitStatus::kDone, "local", "", ""};
   none.kind.clear();

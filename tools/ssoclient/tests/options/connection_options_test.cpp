@@ -24,8 +24,8 @@ std::string KindOf(const ConnectionOptions& options) {
   try {
     options.Address();
   } catch (const ToolException& exception) {
-    EXPECT_EQ(exception.What().status, ExitStatus::kUsage);
-    return exception.What().kind;
+    EXPECT_EQ(exception.GetFailure().status, ExitStatus::kUsage);
+    return exception.GetFailure().kind;
   }
   return "";
 }
@@ -77,9 +77,9 @@ TEST(ConnectionOptionsTest, AFileThatCannotBeLoadedIsALocalFailure) {
       options.MakeSslContext();
       ADD_FAILURE() << path;
     } catch (const ToolException& exception) {
-      EXPECT_EQ(exception.What().status, ExitStatus::kLocal);
-      EXPECT_EQ(exception.What().kind, "tls-files");
-      EXPECT_NE(exception.What().message.find(path), std::string::npos);
+      EXPECT_EQ(exception.GetFailure().status, ExitStatus::kLocal);
+      EXPECT_EQ(exception.GetFailure().kind, "tls-files");
+      EXPECT_NE(exception.GetFailure().message.find(path), std::string::npos);
     }
   }
 }
