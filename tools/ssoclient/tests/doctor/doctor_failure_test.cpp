@@ -60,8 +60,7 @@ TEST(DoctorFailureTest, AServiceThatEndsBeforeTheRequestIsFound) {
   constexpr int kProbesAndTheLibrary = 3;
   const DoctorRun run = RunWithConnections(kProbesAndTheLibrary);
   EXPECT_NE(run.Outcome("certificate"), "failed") << run.Text();
-  EXPECT_EQ(run.Finding("http"), "http-failed") << run.Message("http");
-  EXPECT_EQ(run.Status(), 3);
+  ExpectFailure(run, "http", "http-failed", 3, "sts");
   EXPECT_THAT(run.Message("http"), HasSubstr("the exchange failed: "));
 }
 

@@ -110,7 +110,7 @@ TEST_F(DoctorLoginTest, WithoutASigningCertificateTheSignerIsAWarning) {
   options.descriptors = {{5, "secret\n"}};
   const DoctorRun run(options);
   EXPECT_EQ(run.Status(), 0) << run.Text();
-  EXPECT_EQ(run.Finding("login"), "signature-not-verified");
+  ExpectWarning(run, "login", "signature-not-verified");
   EXPECT_THAT(run.Message("login"), HasSubstr("SHA-256"));
 }
 
@@ -168,7 +168,7 @@ TEST_F(DoctorLoginTest, ATokenThatBeginsLaterIsAWarning) {
   sts.SetAssertionOptions(late);
   const DoctorRun run = RunAlice();
   EXPECT_EQ(run.Status(), 0) << run.Text();
-  EXPECT_EQ(run.Finding("token"), "token-not-yet-valid");
+  ExpectWarning(run, "token", "token-not-yet-valid");
 }
 
 TEST_F(DoctorLoginTest, ATokenThatHasExpiredIsAWarning) {
@@ -178,6 +178,7 @@ TEST_F(DoctorLoginTest, ATokenThatHasExpiredIsAWarning) {
   sts.SetAssertionOptions(early);
   const DoctorRun run = RunAlice();
   EXPECT_EQ(run.Status(), 0) << run.Text();
+  ExpectWarning(run, "token", "token-already-expired");
   EXPECT_EQ(run.FirstCause(), "token-already-expired");
 }
 
@@ -212,7 +213,7 @@ TEST_F(DoctorLoginTest, NoPasswordIsSentOverHttpUnlessThatIsAllowed) {
   options.arguments.push_back("--allow-http");
   const DoctorRun allowed(options);
   EXPECT_EQ(allowed.Status(), 0) << allowed.Text();
-  EXPECT_EQ(allowed.Finding("login"), "signature-not-verified");
+  ExpectWarning(allowed, "login", "signature-not-verified");
 }
 
 TEST_F(DoctorLoginTest, AMissingPasswordIsFound) {

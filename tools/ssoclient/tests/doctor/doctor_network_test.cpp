@@ -70,7 +70,7 @@ TEST(DoctorNetworkTest, AnHttpUrlIsAWarning) {
   const DevSts::Server sts;
   const DoctorRun run = RunDoctor(sts.HttpUrl());
   EXPECT_EQ(run.Status(), 0) << run.Text();
-  EXPECT_EQ(run.Finding("options"), "http-url");
+  ExpectWarning(run, "options", "http-url");
   EXPECT_EQ(run.Finding("tls"), "not-needed");
   EXPECT_EQ(run.Finding("sts"), "ok");
   EXPECT_EQ(RunDoctor(sts.HttpUrl(), {"--strict"}).Status(), 2);

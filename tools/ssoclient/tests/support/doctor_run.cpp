@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
+#include "support/finding_record.h"
 #include "support/findings_page.h"
 
 namespace SsoClient::Tool::Testing {
@@ -26,6 +27,13 @@ const DocumentedFinding& DescriptionOf(const std::string& finding, const std::st
     throw std::runtime_error("docs/tool.md has no " + finding + " in the step " + step);
   }
   return *found;
+}
+
+void ExpectProblem(const DoctorRun& run, const std::string& step, const std::string& finding) {
+  EXPECT_EQ(run.Finding(step), finding) << run.Message(step);
+  EXPECT_NE(run.Message(step), "");
+  EXPECT_NE(run.Remedy(step), "");
+  RecordFinding(run.Finding(step));
 }
 
 }  // namespace
@@ -100,18 +108,14 @@ DoctorRun RunDoctor(const std::string& url, const std::vector<std::string>& argu
 
 void ExpectWarning(const DoctorRun& run, const std::string& step, const std::string& finding) {
   EXPECT_EQ(run.Outcome(step), "warning") << run.Text();
-  EXPECT_EQ(run.Finding(step), finding) << run.Message(step);
-  EXPECT_NE(run.Message(step), "");
-  EXPECT_NE(run.Remedy(step), "");
+  ExpectProblem(run, step, finding);
 }
 
 void ExpectFailure(const DoctorRun& run, const std::string& step, const std::string& finding,
                    int status, const std::string& skipped) {
   EXPECT_EQ(run.Status(), status) << run.Text();
   EXPECT_EQ(run.Outcome(step), "failed");
-  EXPECT_EQ(run.Finding(step), finding) << run.Message(step);
-  EXPECT_NE(run.Message(step), "");
-  EXPECT_NE(run.Remedy(step), "");
+  ExpectProblem(run, step, finding);
   EXPECT_EQ(run.FirstCause(), finding);
   if (!skipped.empty()) {
     EXPECT_EQ(run.Outcome(skipped), "skipped");
