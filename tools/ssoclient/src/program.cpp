@@ -102,9 +102,7 @@ ExitStatus RunCommand(const Console& console, const Registered& chosen) {
   }
 }
 
-}  // namespace
-
-ExitStatus RunProgram(int argc, const char* const* argv, const Console& console) {
+ExitStatus RunCommandLine(int argc, const char* const* argv, const Console& console) {
   CLI::App program("Obtains, renews and checks SAML tokens of a Security Token Service.",
                    "ssoclient");
   program.set_version_flag("--version", std::string("ssoclient ") + SSOCLIENT_TOOL_VERSION,
@@ -126,6 +124,18 @@ ExitStatus RunProgram(int argc, const char* const* argv, const Console& console)
     return each.subcommand->parsed();
   });
   return RunCommand(console, *chosen);
+}
+
+}  // namespace
+
+ExitStatus RunProgram(int argc, const char* const* argv, const Console& console) {
+  try {
+    return RunCommandLine(argc, argv, console);
+  } catch (const std::exception& exception) {
+    // Such as a lack of memory while a failure is reported. What is written here needs no memory.
+    console.err << "ssoclient: " << exception.what() << '\n';
+    return ExitStatus::kLocal;
+  }
 }
 
 }  // namespace SsoClient::Tool

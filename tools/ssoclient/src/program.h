@@ -7,7 +7,8 @@
 namespace SsoClient::Tool {
 
 /// Reads the command line, runs the command and reports its failure: with --json as an object with
-/// the member "error" on `console.out`, otherwise as text on `console.err`.
+/// the member "error" on `console.out`, otherwise as text on `console.err`. Returns `kLocal` if
+/// that report itself fails.
 ExitStatus RunProgram(int argc, const char* const* argv, const Console& console);
 
 }  // namespace SsoClient::Tool

@@ -1,5 +1,8 @@
 #include "program.h"
 
+#include <ostream>
+#include <sstream>
+#include <streambuf>
 #include <string>
 #include <utility>
 #include <vector>
@@ -13,8 +16,10 @@
 namespace SsoClient::Tool::Testing {
 namespace {
 
+using testing::EndsWith;
 using testing::HasSubstr;
 using testing::Not;
+using testing::StartsWith;
 
 constexpr const char* kSecret = "hunter2";
 
@@ -123,6 +128,21 @@ TEST(ProgramTest, TheNextArgumentIsNotTheValueOfAnOptionWithoutOne) {
   EXPECT_EQ(result.status, 2);
   EXPECT_THAT(result.out, HasSubstr("--output: it must not be empty"));
   EXPECT_THAT(RunTool({"show", "--", "--name="}).err, HasSubstr("the token file --name=: "));
+}
+
+// Has no place for any character.
+class FullBuffer : public std::streambuf {};
+
+// A stream that throws, as anything may when the memory is used up.
+TEST(ProgramTest, AReportThatCannotBeMadeIsALocalFailure) {
+  FullBuffer full;
+  std::ostream out(&full);
+  out.exceptions(std::ostream::badbit);
+  std::ostringstream err;
+  const char* const arguments[] = {"ssoclient", "show", "--json", "--unknown"};
+  EXPECT_EQ(RunProgram(4, arguments, Console{out, err}), ExitStatus::kLocal);
+  EXPECT_THAT(err.str(), StartsWith("ssoclient: "));
+  EXPECT_THAT(err.str(), EndsWith("\n"));
 }
 
 }  // namespace
